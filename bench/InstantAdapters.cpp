@@ -1,0 +1,85 @@
+#include "InstantAdapters.h"
+
+#include <unistd.h>
+
+#include <filesystem>
+#include <fstream>
+
+#include "MidAPI/ma.h"
+#include "Utils/Log.h"
+
+namespace bench {
+
+namespace {
+
+constexpr std::size_t kPortsPerCard = 4;
+constexpr std::size_t kDevicesPerBus = 32;
+
+class InstantBackend : public ma::Backend {
+  public:
+    explicit InstantBackend(std::size_t ports) {
+        for (std::size_t i = 0; i < ports; ++i)
+            m_names.push_back(InstantAdapters::portName(i));
+    }
+
+    utils::StringArray enumerateAdapters() override { return m_names; }
+
+    utils::PCIAddr getPCIAddress(const std::string& adapter) override {
+        const std::size_t index = std::stoul(adapter.substr(4));
+        const std::size_t card = index / kPortsPerCard;
+        return {static_cast<std::uint8_t>(card / kDevicesPerBus),
+                static_cast<std::uint8_t>(card % kDevicesPerBus),
+                static_cast<std::uint8_t>(index % kPortsPerCard), false, adapter};
+    }
+
+    bool getCanBeUpdated(const std::string&) override { return true; }
+
+    bool getAdapterFirmwareVersion(const std::string&, std::vector<utils::FirmwareVersionInfo>&) override {
+        return true;
+    }
+
+    int prepareFlashImage(const std::string&, const uint8_t*, uint32_t, uint8_t*, uint32_t*,
+                          std::vector<utils::FirmwareType>&) override {
+        return ma::PREPARED;
+    }
+
+    bool writeFlashImage(const std::string&, const uint8_t*, uint32_t, uint32_t&, std::string&) override {
+        return true;
+    }
+
+    bool updateCapabilityWord(const std::string&, const std::vector<utils::FirmwareType>&, uint32_t&,
+                              std::string&) override {
+        return true;
+    }
+
+    uint16_t getFlashImageUpdateProgress(const std::string&) override { return 0; }
+    bool setBootType(const std::string&, ma::BootType) override { return true; }
+    ma::AdapterInfo getAdapterInfo(const std::string&) override { return {}; }
+
+  private:
+    utils::StringArray m_names;
+};
+
+std::filesystem::path scratch(const char* name) {
+    return std::filesystem::temp_directory_path() / (std::string(name) + std::to_string(getpid()));
+}
+
+}  // namespace
+
+InstantAdapters::InstantAdapters(std::size_t ports)
+    : m_config("/nonexistent"), m_imageUri("file://" + scratch("quenx-bench-image-").string()) {
+    std::ofstream(m_imageUri.substr(7)) << std::string(1024, '\0');
+    utils::logLevel = 0;  // what is measured is not the system log
+    m_previous = ma::setBackend(std::make_shared<InstantBackend>(ports));
+}
+
+InstantAdapters::~InstantAdapters() {
+    ma::setBackend(m_previous);
+    std::filesystem::remove(m_imageUri.substr(7));
+}
+
+std::string InstantAdapters::portName(std::size_t index) {
+    return "port" + std::to_string(index);
+}
+
+}  // namespace bench

@@ -1,0 +1,57 @@
+# One place for the compiler's settings: every target of the project links quenx_settings.
+
+find_package(Threads REQUIRED)
+
+# A compiler cache may hand over paths relative to the build folder.
+file(RELATIVE_PATH quenx_source_from_build ${CMAKE_BINARY_DIR} ${PROJECT_SOURCE_DIR})
+
+add_library(quenx_settings INTERFACE)
+target_include_directories(quenx_settings INTERFACE ${PROJECT_SOURCE_DIR}/src)
+target_link_libraries(quenx_settings INTERFACE Threads::Threads)
+target_compile_options(quenx_settings INTERFACE
+    -Wall -Wextra -Wpedantic -Wshadow -Wconversion -Wsign-conversion -Wnon-virtual-dtor -Wold-style-cast
+    -Wcast-align -Woverloaded-virtual -Wformat=2 -Werror
+    -fvisibility=hidden -fvisibility-inlines-hidden -fno-omit-frame-pointer
+    # Source paths appear in log lines and assertion texts: keep them relative to the project.
+    -ffile-prefix-map=${PROJECT_SOURCE_DIR}/= -ffile-prefix-map=${quenx_source_from_build}=)
+
+if(CMAKE_CXX_COMPILER_ID STREQUAL "GNU")
+    # Unique symbols pin a library: dlclose would never unload it.
+    target_compile_options(quenx_settings INTERFACE
+        -fno-gnu-unique
+        -Wno-error=stringop-overflow  # false finding of g++ 12 on an atomic pointer store
+        -Wno-error=maybe-uninitialized -Wno-error=restrict)
+else()
+    target_compile_options(quenx_settings INTERFACE -Wthread-safety -Wno-unknown-warning-option)
+endif()
+
+if(QUENX_X86_32)
+    target_compile_options(quenx_settings INTERFACE -m32 -msse2 -mfpmath=sse)
+    target_link_options(quenx_settings INTERFACE -m32)
+    target_compile_definitions(quenx_settings INTERFACE _TIME_BITS=64 _FILE_OFFSET_BITS=64)
+endif()
+
+if(QUENX_SANITIZE)
+    target_compile_options(quenx_settings INTERFACE -fsanitize=${QUENX_SANITIZE} -fno-sanitize-recover=all)
+    target_link_options(quenx_settings INTERFACE -fsanitize=${QUENX_SANITIZE})
+    # Keeps a provider mapped after dlclose, so that a leak report names its file and line.
+    target_compile_definitions(quenx_settings INTERFACE QUENX_SANITIZED=1)
+endif()
+if(QUENX_FUZZ)
+    target_compile_options(quenx_settings INTERFACE -fsanitize=fuzzer-no-link)
+endif()
+if(QUENX_COVERAGE)
+    target_compile_options(quenx_settings INTERFACE --coverage)
+    target_link_options(quenx_settings INTERFACE --coverage)
+endif()
+
+include(cmake/QuenxPrecompiled.cmake)
+
+# quenx_library(NAME SOURCES... [LINK targets...]): a shared library libNAME.so
+function(quenx_library name)
+    cmake_parse_arguments(ARG "" "" "LINK" ${ARGN})
+    add_library(${name} SHARED ${ARG_UNPARSED_ARGUMENTS})
+    target_link_libraries(${name} PUBLIC quenx_settings ${ARG_LINK})
+    quenx_precompile(${name} library)
+    target_link_options(${name} PRIVATE -Wl,--no-undefined-version -Wl,-z,relro,-z,now)
+endfunction()

@@ -1,0 +1,11 @@
+#pragma once
+
+#include <string>
+
+namespace cli {
+
+/// The password for a user: from the environment variable QUENXCTL_PASSWORD, else asked for on the terminal
+/// without showing what is typed. Throws Failure where there is neither, since nobody could answer.
+std::string passwordOf(const std::string& user);
+
+}  // namespace cli

@@ -1,0 +1,13 @@
+#pragma once
+
+namespace cli {
+
+/// What the program tells the script that called it; the help text documents them.
+enum class ExitStatus {
+    Done = 0,
+    Failed = 1,
+    WrongUse = 2,
+    AlreadyCurrent = 3,  ///< what was to be installed is what is installed
+};
+
+}  // namespace cli

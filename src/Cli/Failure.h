@@ -1,0 +1,25 @@
+#pragma once
+
+#include <stdexcept>
+#include <string>
+
+#include "Cli/ExitStatus.h"
+
+namespace cli {
+
+/// The end of a verb that could not do its work: what happened, and what to do next.
+class Failure : public std::runtime_error {
+  public:
+    /// @param advice  a full sentence that says what to do next; may be empty
+    Failure(ExitStatus status, const std::string& what, std::string advice)
+        : std::runtime_error(what), status_(status), advice_(std::move(advice)) {}
+
+    ExitStatus status() const { return status_; }
+    const std::string& advice() const { return advice_; }
+
+  private:
+    ExitStatus status_;
+    std::string advice_;
+};
+
+}  // namespace cli

@@ -1,0 +1,41 @@
+#pragma once
+
+#include <cstdint>
+#include <string>
+
+#include "Cli/Management.h"
+
+namespace cli {
+
+/// States of a job (the DMTF's value map of CIM_ConcreteJob.JobState) that the program tells apart.
+enum JobState : std::uint16_t {
+    JOB_RUNNING = 4,
+    JOB_COMPLETED = 7,
+    JOB_TERMINATED = 8,
+    JOB_KILLED = 9,
+    JOB_EXCEPTION = 10,
+};
+
+/// A job as it was when it was read.
+struct JobView {
+    core::CimPath path;
+    std::string id;
+    std::uint16_t state = 0;
+    unsigned percent = 0;
+    std::uint16_t errorCode = 0;
+    std::string errorDescription;
+
+    /// No further change will come.
+    bool hasEnded() const { return state >= JOB_COMPLETED && state <= JOB_EXCEPTION; }
+    bool hasSucceeded() const { return state == JOB_COMPLETED; }
+    /// What is done for certain: a job reports 100 % too when it failed, so only a completed one is believed.
+    unsigned certainPercent() const;
+};
+
+JobView viewOf(const core::InstanceValue& job);
+JobView readJob(Management& management, const core::CimPath& path);
+
+/// The state's name: "Running", "Completed".
+std::string jobStateName(std::uint16_t state);
+
+}  // namespace cli

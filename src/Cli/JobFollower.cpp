@@ -1,0 +1,46 @@
+#include "Cli/JobFollower.h"
+
+#include <algorithm>
+
+#include "Cli/Failure.h"
+
+namespace cli {
+
+namespace {
+
+/// So many looks in a row may fail: a connection can break, and the update goes on all the same.
+constexpr unsigned MOST_FAILURES = 20;
+
+JobView lookAt(Management& management, const core::CimPath& job, const Following& following) {
+    for (unsigned failures = 1;; ++failures) {
+        try {
+            return readJob(management, job);
+        } catch (const Failure& failure) {
+            if (failures == MOST_FAILURES) {
+                throw Failure(failure.status(), failure.what(),
+                              "The update goes on all the same; \"quenxctl jobs\" shows how it ends.");
+            }
+        }
+        following.pause();
+    }
+}
+
+}  // namespace
+
+JobView followJob(Management& management, const core::CimPath& job, UpdateObserver& observer,
+                  const Following& following) {
+    unsigned shown = 0;
+    while (true) {
+        const JobView view = lookAt(management, job, following);
+        shown = std::max(shown, view.certainPercent());
+        observer.progressed(shown);
+        if (view.hasEnded()) {
+            observer.ended(view);
+            return view;
+        }
+        if (following.interrupted()) observer.interrupted();
+        following.pause();
+    }
+}
+
+}  // namespace cli

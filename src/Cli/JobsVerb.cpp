@@ -1,0 +1,64 @@
+#include "Cli/Failure.h"
+#include "Cli/Job.h"
+#include "Cli/Json.h"
+#include "Cli/TextTable.h"
+#include "Cli/Values.h"
+#include "Cli/Verbs.h"
+
+namespace cli {
+
+namespace {
+
+constexpr const char* JOB_CLASS = "Quenx_ConcreteJob";
+
+/// Jobs live as long as the process that runs them: this one has none that somebody else could have started.
+void requireServer(const Management& management) {
+    if (!management.runsJobs()) return;
+    throw Failure(ExitStatus::WrongUse,
+                  "Jobs are kept by a server; an update of this program's own ends with it.",
+                  "Name the server with --server.");
+}
+
+std::vector<JobView> readJobs(Management& management) {
+    std::vector<JobView> jobs;
+    for (const core::InstanceValue& job : management.enumerateInstances(JOB_CLASS))
+        jobs.push_back(viewOf(job));
+    return jobs;
+}
+
+}  // namespace
+
+ExitStatus showJobs(Context& context) {
+    requireServer(context.management);
+    const std::vector<JobView> jobs = readJobs(context.management);
+    if (context.json) {
+        Json list = Json::array();
+        for (const JobView& job : jobs)
+            list.push_back(toJson(job));
+        printJson(context.out, {{"jobs", std::move(list)}});
+        return ExitStatus::Done;
+    }
+    std::vector<std::vector<std::string>> rows = {{"JOB", "STATE", "PERCENT", "ERROR"}};
+    for (const JobView& job : jobs) {
+        rows.push_back({job.id, jobStateName(job.state), std::to_string(job.percent), job.errorDescription});
+    }
+    printTable(context.out, rows);
+    return ExitStatus::Done;
+}
+
+ExitStatus deleteJob(Context& context, const std::string& id) {
+    requireServer(context.management);
+    for (const JobView& job : readJobs(context.management)) {
+        if (job.id != id && job.path.toString() != id) continue;
+        context.management.deleteInstance(job.path);
+        if (context.json) {
+            printJson(context.out, {{"deleted", job.id}});
+        } else {
+            context.out << "Deleted " << job.id << ".\n";
+        }
+        return ExitStatus::Done;
+    }
+    throw Failure(ExitStatus::Failed, "There is no job \"" + id + "\".", "\"quenxctl jobs\" lists the jobs.");
+}
+
+}  // namespace cli

@@ -1,0 +1,124 @@
+#include "Cli/LocalManagement.h"
+
+#include <unistd.h>
+
+#include <cstdlib>
+#include <filesystem>
+#include <system_error>
+
+#include "Cli/Failure.h"
+#include "MidAPI/ma.h"
+
+#ifndef QUENX_PROVIDER_DIR
+#define QUENX_PROVIDER_DIR "/usr/lib/quenx"
+#endif
+
+namespace cli {
+
+namespace fs = std::filesystem;
+
+namespace {
+
+void requireReadable(const std::string& file, const std::string& what) {
+    if (access(file.c_str(), R_OK) == 0) return;
+    const std::string reason = std::generic_category().message(errno);
+    throw Failure(ExitStatus::WrongUse, "Cannot read the " + what + " " + file + ": " + reason + ".",
+                  "Name a file that exists and that you may read.");
+}
+
+/// Beside the program as it is built and unpacked, else where it is installed.
+std::string defaultProviderDirectory() {
+    std::error_code error;
+    const fs::path program = fs::read_symlink("/proc/self/exe", error);
+    const fs::path beside = program.parent_path().parent_path() / "lib";
+    if (!error && fs::exists(beside / "libQuenx_SoftwareUpdate.so", error)) return beside.string();
+    return QUENX_PROVIDER_DIR;
+}
+
+void selectAdapters(const LocalSettings& settings) {
+    if (settings.adapterDescription.empty()) return;
+    requireReadable(settings.adapterDescription, "adapter description");
+    const std::string state = settings.stateDirectory.empty()
+                                  ? defaultStateDirectory(settings.adapterDescription)
+                                  : settings.stateDirectory;
+    try {
+        ma::configureSimulator(settings.adapterDescription, state);
+    } catch (const std::exception& error) {
+        throw Failure(ExitStatus::Failed, error.what(), "Correct the adapter description and try again.");
+    }
+}
+
+void loadProviders(core::ProviderLibraries& providers, const std::string& directory) {
+    const std::string advice = "Name the directory that holds libQuenx_SoftwareUpdate.so with --providers.";
+    try {
+        providers.load(directory);
+    } catch (const std::system_error& error) {
+        throw Failure(ExitStatus::Failed,
+                      "Cannot read the provider directory " + directory + ": " + error.code().message() + ".",
+                      advice);
+    }
+    if (!providers.problems().empty()) {
+        const auto& problem = providers.problems().front();
+        throw Failure(ExitStatus::Failed, "Cannot load " + problem.file + ": " + problem.reason + ".",
+                      "All the libraries have to come from one build; " + advice);
+    }
+    if (providers.loaded().empty()) {
+        throw Failure(ExitStatus::Failed, "There is no provider library in " + directory + ".", advice);
+    }
+}
+
+}  // namespace
+
+std::string defaultStateDirectory(const std::string& adapterDescription) {
+    const char* chosen = std::getenv("QUENX_ADAPTER_STATE");
+    if (chosen != nullptr && *chosen != '\0') return chosen;
+    return fs::absolute(adapterDescription).replace_extension(".state").string();
+}
+
+LocalManagement::LocalManagement(const LocalSettings& settings) {
+    if (!settings.configFile.empty()) {
+        requireReadable(settings.configFile, "configuration file");
+        config_.emplace(settings.configFile);
+    }
+    selectAdapters(settings);
+    loadProviders(providers_, settings.providerDirectory.empty() ? defaultProviderDirectory()
+                                                                 : settings.providerDirectory);
+    requests_.emplace(utils::SMASHv2Config::getInstance()->getNamespace());
+}
+
+std::vector<core::InstanceValue> LocalManagement::enumerateInstances(const std::string& className) {
+    return requests_->enumerateInstances(className);
+}
+
+std::vector<core::CimPath> LocalManagement::enumerateInstanceNames(const std::string& className) {
+    return requests_->enumerateInstanceNames(className);
+}
+
+core::InstanceValue LocalManagement::getInstance(const core::CimPath& path) {
+    return requests_->getInstance(path);
+}
+
+std::vector<core::InstanceValue> LocalManagement::associators(const core::CimPath& path,
+                                                              const core::AssociationFilter& by) {
+    return requests_->associators(path, by);
+}
+
+std::vector<core::CimPath> LocalManagement::associatorNames(const core::CimPath& path,
+                                                            const core::AssociationFilter& by) {
+    return requests_->associatorNames(path, by);
+}
+
+core::MethodResult LocalManagement::invokeMethod(const core::CimPath& path, const std::string& method,
+                                                 const std::vector<core::Argument>& arguments) {
+    return requests_->invokeMethod(path, method, arguments);
+}
+
+void LocalManagement::deleteInstance(const core::CimPath& path) {
+    requests_->deleteInstance(path);
+}
+
+std::vector<core::ClassDeclaration> LocalManagement::classes() {
+    return requests_->enumerateClasses("", true);
+}
+
+}  // namespace cli

@@ -1,0 +1,13 @@
+#pragma once
+
+#include <string>
+#include <vector>
+
+#include "Framework/ClassDeclaration.h"
+
+namespace cli {
+
+/// The classes as MOF (DSP0004 annex A), superclasses before their subclasses.
+std::string mofText(std::vector<core::ClassDeclaration> classes);
+
+}  // namespace cli

@@ -1,0 +1,174 @@
+#include "Cli/RemoteManagement.h"
+
+#include "Cli/Failure.h"
+#include "Host/CimXml/RequestWriter.h"
+#include "Host/CimXml/ResponseReader.h"
+#include "Host/CimXml/WireError.h"
+
+namespace cli {
+
+namespace {
+
+using cimxml::ClassName;
+using cimxml::Parameter;
+using cimxml::ParameterValue;
+
+bool isLoopbackHost(const std::string& url) {
+    std::string host = url.substr(url.find("://") == std::string::npos ? 0 : url.find("://") + 3);
+    if (host.starts_with("[::1]")) return true;
+    host = host.substr(0, host.find_first_of(":/"));
+    return host == "localhost" || host.starts_with("127.");
+}
+
+std::string percentEncoded(const std::string& text) {
+    constexpr std::string_view DIGITS = "0123456789ABCDEF";
+    std::string result;
+    for (const char c : text) {
+        const auto byte = static_cast<unsigned char>(c);
+        const bool isPlain = (c >= 'a' && c <= 'z') || (c >= 'A' && c <= 'Z') || (c >= '0' && c <= '9') ||
+                             c == '.' || c == '_' || c == '-' || c == '=' || c == ',';
+        if (isPlain) {
+            result += c;
+        } else {
+            result += '%';
+            result += DIGITS[byte >> 4];
+            result += DIGITS[byte & 0xF];
+        }
+    }
+    return result;
+}
+
+std::vector<Parameter> associationParameters(const core::CimPath& path, const core::AssociationFilter& by) {
+    std::vector<Parameter> parameters = {{"ObjectName", path}};
+    if (!by.associationClass.empty()) parameters.push_back({"AssocClass", ClassName{by.associationClass}});
+    if (!by.resultClass.empty()) parameters.push_back({"ResultClass", ClassName{by.resultClass}});
+    if (!by.role.empty()) parameters.push_back({"Role", by.role});
+    if (!by.resultRole.empty()) parameters.push_back({"ResultRole", by.resultRole});
+    return parameters;
+}
+
+core::ClassDeclaration declarationOf(const cimxml::ClassElement& element) {
+    core::ClassDeclaration declaration;
+    declaration.name = element.name;
+    declaration.superclass = element.superclass;
+    for (const cimxml::Qualifier& qualifier : element.qualifiers) {
+        if (core::sameName(qualifier.name, "Association")) declaration.isAssociation = true;
+    }
+    for (const cimxml::ClassProperty& property : element.properties) {
+        declaration.properties.push_back(property.declaration);
+    }
+    for (const cimxml::ClassMethod& method : element.methods) {
+        core::MethodDeclaration one{method.name, method.returnType, {}};
+        for (const cimxml::ClassParameter& parameter : method.parameters) {
+            one.parameters.push_back(parameter.declaration);
+        }
+        declaration.methods.push_back(std::move(one));
+    }
+    return declaration;
+}
+
+void requireOk(const HttpReply& reply) {
+    if (reply.status == 200) return;
+    const std::string why = reply.cimError.empty() ? "" : " (" + reply.cimError + ")";
+    if (reply.status == 401) {
+        throw Failure(ExitStatus::Failed, "The server does not accept the user name and password.",
+                      "Give them with --user and the environment variable QUENXCTL_PASSWORD.");
+    }
+    throw Failure(ExitStatus::Failed,
+                  "The server answered with HTTP status " + std::to_string(reply.status) + why + ".",
+                  "Check that --server names a CIM-XML server; its log has the details.");
+}
+
+}  // namespace
+
+RemoteManagement::RemoteManagement(const ServerSettings& settings)
+    : client_(settings), namespace_(settings.namespaceName), isLoopback_(isLoopbackHost(settings.url)) {}
+
+cimxml::Response RemoteManagement::send(cimxml::Request request, const std::string& object) {
+    request.messageId = std::to_string(++messages_);
+    const HttpReply reply =
+        client_.post({"Content-Type: application/xml; charset=\"utf-8\"",
+                      "Expect:", "CIMProtocolVersion: 1.0", "CIMOperation: MethodCall",
+                      "CIMMethod: " + percentEncoded(request.name()), "CIMObject: " + percentEncoded(object)},
+                     cimxml::writeRequest(request));
+    requireOk(reply);
+    try {
+        cimxml::Response response = cimxml::readResponse(reply.body);
+        if (const auto* failure = std::get_if<cimxml::Failure>(&response.content)) {
+            throw core::CimError(failure->status, failure->description);
+        }
+        return response;
+    } catch (const cimxml::WireError& error) {
+        throw Failure(ExitStatus::Failed,
+                      std::string("The server's answer cannot be read: ") + error.what() + ".",
+                      "Check that --server names a CIM-XML server.");
+    }
+}
+
+cimxml::IntrinsicResult RemoteManagement::callIntrinsic(const std::string& operation,
+                                                        std::vector<Parameter> parameters) {
+    cimxml::Request request;
+    request.call = cimxml::IntrinsicCall{operation, namespace_, std::move(parameters)};
+    cimxml::Response response = send(std::move(request), namespace_);
+    auto* result = std::get_if<cimxml::IntrinsicResult>(&response.content);
+    return result == nullptr ? cimxml::IntrinsicResult{} : std::move(*result);
+}
+
+std::vector<core::InstanceValue> RemoteManagement::enumerateInstances(const std::string& className) {
+    return callIntrinsic("EnumerateInstances",
+                         {{"ClassName", ClassName{className}}, {"LocalOnly", std::string("FALSE")}})
+        .instances;
+}
+
+std::vector<core::CimPath> RemoteManagement::enumerateInstanceNames(const std::string& className) {
+    return callIntrinsic("EnumerateInstanceNames", {{"ClassName", ClassName{className}}}).paths;
+}
+
+core::InstanceValue RemoteManagement::getInstance(const core::CimPath& path) {
+    auto instances =
+        callIntrinsic("GetInstance", {{"InstanceName", path}, {"LocalOnly", std::string("FALSE")}}).instances;
+    if (instances.empty()) throw core::CimError(core::CimStatus::NotFound, path.toString());
+    // The answer does not repeat the path.
+    instances.front().path = path;
+    return std::move(instances.front());
+}
+
+std::vector<core::InstanceValue> RemoteManagement::associators(const core::CimPath& path,
+                                                               const core::AssociationFilter& by) {
+    return callIntrinsic("Associators", associationParameters(path, by)).instances;
+}
+
+std::vector<core::CimPath> RemoteManagement::associatorNames(const core::CimPath& path,
+                                                             const core::AssociationFilter& by) {
+    return callIntrinsic("AssociatorNames", associationParameters(path, by)).paths;
+}
+
+core::MethodResult RemoteManagement::invokeMethod(const core::CimPath& path, const std::string& method,
+                                                  const std::vector<core::Argument>& arguments) {
+    core::CimPath object = path;
+    object.completeNamespace(namespace_);
+    cimxml::MethodCall call{method, object, false, {}};
+    for (const core::Argument& argument : arguments) {
+        call.arguments.push_back({argument.name, cimxml::rawValueOf(argument.value)});
+    }
+    cimxml::Request request;
+    request.call = std::move(call);
+    cimxml::Response response = send(std::move(request), object.toString());
+    auto* result = std::get_if<cimxml::ExtrinsicResult>(&response.content);
+    return result == nullptr ? core::MethodResult{} : std::move(result->result);
+}
+
+void RemoteManagement::deleteInstance(const core::CimPath& path) {
+    callIntrinsic("DeleteInstance", {{"InstanceName", path}});
+}
+
+std::vector<core::ClassDeclaration> RemoteManagement::classes() {
+    std::vector<core::ClassDeclaration> declarations;
+    const cimxml::IntrinsicResult result = callIntrinsic(
+        "EnumerateClasses", {{"DeepInheritance", std::string("TRUE")}, {"LocalOnly", std::string("TRUE")}});
+    for (const cimxml::ClassElement& element : result.classes)
+        declarations.push_back(declarationOf(element));
+    return declarations;
+}
+
+}  // namespace cli

@@ -1,0 +1,5 @@
+#include "Cli/CommandLine.h"
+
+int main(int argc, char** argv) {
+    return cli::runCommandLine(argc, argv);
+}

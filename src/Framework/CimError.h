@@ -1,0 +1,45 @@
+#pragma once
+
+#include <stdexcept>
+#include <string>
+
+#include "Utils/Export.h"
+
+namespace core {
+
+/// The status codes of CIM operations (DSP0223 Annex, DSP0200 5.5).
+enum class CimStatus {
+    Failed = 1,
+    AccessDenied = 2,
+    InvalidNamespace = 3,
+    InvalidParameter = 4,
+    InvalidClass = 5,
+    NotFound = 6,
+    NotSupported = 7,
+    NoSuchProperty = 12,
+    TypeMismatch = 13,
+    QueryLanguageNotSupported = 14,
+    MethodNotAvailable = 16,
+    MethodNotFound = 17,
+    InvalidEnumerationContext = 21,
+    InvalidOperationTimeout = 22,
+    FilteredEnumerationNotSupported = 25,
+    ContinuationOnErrorNotSupported = 26,
+    ServerLimitsExceeded = 27,
+    ServerIsShuttingDown = 28
+};
+
+/// A request that ends with a CIM status. Unlike the providers' exceptions it does not log itself: a client's
+/// wrong request is the client's affair.
+class QUENX_EXPORT CimError : public std::runtime_error {
+  public:
+    CimError(CimStatus status, const std::string& description);
+    ~CimError() override;
+
+    CimStatus status() const { return m_status; }
+
+  private:
+    CimStatus m_status;
+};
+
+}  // namespace core

@@ -1,0 +1,66 @@
+#include "Framework/CimPropertyRef.h"
+
+#include "Framework/CimInstance.h"
+
+namespace core {
+
+CimPropertyRef::CimPropertyRef(const char* name, CimInstance* owner)
+    : CimProperty(name, owner, CimType::Reference, false) {}
+
+std::string CimPropertyRef::toString() {
+    return getPath().toString();
+}
+
+CimType CimPropertyRef::getType() {
+    return CimProperty::getType();
+}
+
+void CimPropertyRef::modify(CimProperty* requested) {
+    CimProperty::modify(requested);
+}
+
+void CimPropertyRef::verify(CimProperty* requested) {
+    CimProperty::verify(requested);
+}
+
+CimPath CimPropertyRef::getPath() const {
+    const Guard guard(*this);
+    return m_null ? CimPath() : m_path;
+}
+
+void CimPropertyRef::setPath(CimPath path) {
+    const Guard guard(*this);
+    m_path = std::move(path);
+    m_target.reset();
+    m_null = false;
+}
+
+std::shared_ptr<CimInstance> CimPropertyRef::getInstance() const {
+    const Guard guard(*this);
+    return m_null ? nullptr : m_target.lock();
+}
+
+void CimPropertyRef::assign(const CimInstance* target) {
+    if (target == nullptr) {
+        setNull();
+        return;
+    }
+    // Read the target before locking the owner: two instances are never locked at once.
+    CimPath path = CimPath::of(*target);
+    auto hold = std::const_pointer_cast<CimInstance>(target->weak_from_this().lock());
+    const Guard guard(*this);
+    m_path = std::move(path);
+    m_target = hold;
+    m_null = false;
+}
+
+void CimPropertyRef::load(CimValue& value) const {
+    value.data = CimScalar(m_path);
+}
+
+void CimPropertyRef::store(const CimValue& value) {
+    m_path = std::get<CimPath>(*value.scalar());
+    m_target.reset();
+}
+
+}  // namespace core

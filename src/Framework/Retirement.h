@@ -1,0 +1,24 @@
+#pragma once
+
+#include "Utils/Export.h"
+
+namespace core {
+
+class CimInstance;
+
+/// Destroys an instance that nobody holds any more: at once, or on a thread of its own when the instance's
+/// destructor waits. Never fails; where that thread cannot be had, it waits on the caller's.
+void retireInstance(CimInstance* instance) noexcept;
+
+/// Makes sure that the thread's owner is built, and so destroyed after the object that is being built now.
+void prepareRetirement();
+
+/// Returns when every instance retired so far is destroyed, code of its library included.
+QUENX_EXPORT void drainRetired() noexcept;
+
+/// The deleter of listed instances.
+struct InstanceRelease {
+    void operator()(CimInstance* instance) const noexcept { retireInstance(instance); }
+};
+
+}  // namespace core

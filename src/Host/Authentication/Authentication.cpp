@@ -1,0 +1,60 @@
+#include "Host/Authentication/Authentication.h"
+
+#include "Host/Authentication/BasicHeader.h"
+#include "Utils/Log.h"
+
+namespace host {
+
+namespace {
+
+/// Password hashes are made to be costly, so a flood of them is kept to a part of the processors.
+constexpr unsigned int kChecksAtATime = 2;
+constexpr std::chrono::seconds kWaitForCheck{10};
+
+}  // namespace
+
+Authentication::Authentication(std::unique_ptr<PasswordChecker> checker, std::chrono::seconds rememberFor)
+    : m_checker(std::move(checker)), m_cache(rememberFor), m_checks(kChecksAtATime) {}
+
+AuthenticationResult Authentication::authenticate(const std::optional<std::string>& header,
+                                                  const std::string& address) {
+    const auto credentials = header ? readBasicHeader(*header) : std::nullopt;
+    if (!credentials) return {AuthenticationOutcome::Missing, {}};
+    std::optional<Identity> identity = m_cache.find(*credentials);
+    if (!identity) {
+        const auto turn = m_delays.admit(address);
+        if (!turn || !m_stop.sleepUntil(*turn)) return {AuthenticationOutcome::Busy, {}};
+        const Slots::Use check(m_checks, kWaitForCheck);
+        if (!check) return {AuthenticationOutcome::Busy, {}};
+        identity = checkNow(*credentials, address);
+    }
+    if (!identity) return {AuthenticationOutcome::Wrong, {}};
+    return {identity->mayRead ? AuthenticationOutcome::Accepted : AuthenticationOutcome::Forbidden,
+            *identity};
+}
+
+std::optional<Identity> Authentication::checkNow(const Credentials& credentials, const std::string& address) {
+    // Several requests may have come with the same credentials while the first of them was checked.
+    std::optional<Identity> identity = m_cache.find(credentials);
+    if (identity) return identity;
+    identity = m_checker->check(credentials, address);
+    if (identity) {
+        m_delays.succeeded(address);
+        m_cache.remember(credentials, *identity);
+    } else {
+        m_delays.failed(address);
+        QUENX_ERROR("wrong user or password \"%s\" from %s", credentials.user.c_str(), address.c_str());
+    }
+    return identity;
+}
+
+void Authentication::reload() {
+    m_cache.clear();
+    m_checker->reload();
+}
+
+void Authentication::stop() {
+    m_stop.stop();
+}
+
+}  // namespace host

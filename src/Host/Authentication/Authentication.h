@@ -1,0 +1,53 @@
+#pragma once
+
+#include <memory>
+#include <optional>
+#include <string>
+
+#include "Host/Authentication/CredentialCache.h"
+#include "Host/Authentication/FailureDelays.h"
+#include "Host/Authentication/PasswordChecker.h"
+#include "Host/Server/Slots.h"
+
+namespace host {
+
+enum class AuthenticationOutcome {
+    Accepted,
+    Missing,    ///< no credentials, or none that can be read
+    Wrong,      ///< unknown user or wrong password
+    Forbidden,  ///< known, but not admitted
+    Busy        ///< not looked at: too many attempts
+};
+
+struct AuthenticationResult {
+    AuthenticationOutcome outcome = AuthenticationOutcome::Missing;
+    Identity identity;
+};
+
+/// Who sends a request. Credentials verified a short while ago are accepted at once; others are checked, a
+/// few at a time, and attempts from an address that has sent wrong ones wait. The wait is the calling
+/// connection's own and takes nobody else's place. Thread-safe.
+class Authentication {
+  public:
+    Authentication(std::unique_ptr<PasswordChecker> checker, std::chrono::seconds rememberFor);
+
+    AuthenticationResult authenticate(const std::optional<std::string>& header, const std::string& address);
+
+    /// Forgets verified credentials and reads the users again. Throws std::runtime_error when that fails; the
+    /// users are then as before.
+    void reload();
+
+    /// Lets go of everybody who waits, and refuses whoever would.
+    void stop();
+
+  private:
+    std::optional<Identity> checkNow(const Credentials& credentials, const std::string& address);
+
+    std::unique_ptr<PasswordChecker> m_checker;
+    CredentialCache m_cache;
+    FailureDelays m_delays;
+    Slots m_checks;
+    StopSignal m_stop;
+};
+
+}  // namespace host

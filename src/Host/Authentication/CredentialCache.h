@@ -1,0 +1,42 @@
+#pragma once
+
+#include <array>
+#include <chrono>
+#include <map>
+#include <optional>
+
+#include "Host/Authentication/Identity.h"
+#include "Utils/Os/Linux/Thread.h"
+#include "Utils/ThreadAnnotations.h"
+
+namespace host {
+
+/// Remembers for a short while whose credentials were right, since checking a password costs tens of
+/// milliseconds and clients send it with every request. Keeps no password: only a keyed hash (HMAC-SHA-256)
+/// under a key of this process. Thread-safe.
+class CredentialCache {
+  public:
+    explicit CredentialCache(std::chrono::seconds rememberFor);
+
+    std::optional<Identity> find(const Credentials& credentials);
+    void remember(const Credentials& credentials, const Identity& identity);
+    /// Forgets everything and takes a new key.
+    void clear();
+
+  private:
+    using Clock = std::chrono::steady_clock;
+    using Digest = std::array<unsigned char, 32>;
+    struct Entry {
+        Identity identity;
+        Clock::time_point expires;
+    };
+
+    Digest digestOf(const Credentials& credentials) const QUENX_REQUIRES(m_mutex);
+
+    const std::chrono::seconds m_rememberFor;
+    utils::Mutex m_mutex;
+    Digest m_key QUENX_GUARDED_BY(m_mutex);
+    std::map<Digest, Entry> m_entries QUENX_GUARDED_BY(m_mutex);
+};
+
+}  // namespace host

@@ -1,0 +1,124 @@
+#include "Host/Authentication/PamChecker.h"
+
+#include <grp.h>
+#include <pwd.h>
+#include <security/pam_appl.h>
+
+#include <algorithm>
+#include <array>
+#include <cstdlib>
+#include <cstring>
+
+namespace host {
+
+namespace {
+
+constexpr const char* kService = "quenx-cimd";
+constexpr const char* kAdministrators = "quenx-admin";
+
+/// Answers every prompt for a hidden text with the password, and the others with nothing.
+int converse(int count, const pam_message** messages, pam_response** responses, void* data) {
+    if (count <= 0 || count > PAM_MAX_NUM_MSG) return PAM_CONV_ERR;
+    auto* answers =
+        static_cast<pam_response*>(std::calloc(static_cast<std::size_t>(count), sizeof(pam_response)));
+    if (answers == nullptr) return PAM_BUF_ERR;
+    for (int i = 0; i < count; ++i) {
+        if (messages[i]->msg_style == PAM_PROMPT_ECHO_OFF) {
+            answers[i].resp = ::strdup(static_cast<const Credentials*>(data)->password.c_str());
+        }
+    }
+    *responses = answers;  // PAM frees them
+    return PAM_SUCCESS;
+}
+
+/// PAM's own delay after a failure would hold a place that others wait for; ours is elsewhere.
+void noDelay(int, unsigned int, void*) {}
+
+class PamSession {
+  public:
+    PamSession(const Credentials& credentials, const std::string& address)
+        : m_conversation{converse, const_cast<Credentials*>(&credentials)} {
+        m_status = ::pam_start(kService, credentials.user.c_str(), &m_conversation, &m_handle);
+        if (m_status != PAM_SUCCESS) return;
+        ::pam_set_item(m_handle, PAM_RHOST, address.c_str());
+        void (*delay)(int, unsigned int, void*) = noDelay;
+        ::pam_set_item(m_handle, PAM_FAIL_DELAY, reinterpret_cast<const void*>(delay));
+    }
+    ~PamSession() {
+        if (m_handle != nullptr) ::pam_end(m_handle, m_status);
+    }
+    PamSession(const PamSession&) = delete;
+    PamSession& operator=(const PamSession&) = delete;
+
+    bool authenticate() {
+        constexpr int kFlags = PAM_SILENT | PAM_DISALLOW_NULL_AUTHTOK;
+        if (m_status == PAM_SUCCESS) m_status = ::pam_authenticate(m_handle, kFlags);
+        if (m_status == PAM_SUCCESS) m_status = ::pam_acct_mgmt(m_handle, kFlags);
+        return m_status == PAM_SUCCESS;
+    }
+
+  private:
+    pam_conv m_conversation;
+    pam_handle_t* m_handle = nullptr;
+    int m_status = PAM_SYSTEM_ERR;
+};
+
+struct Account {
+    bool known = false;
+    uid_t uid = 0;
+    gid_t gid = 0;
+};
+
+Account findAccount(const std::string& user) {
+    passwd entry{};
+    passwd* found = nullptr;
+    std::array<char, 16384> buffer{};
+    if (::getpwnam_r(user.c_str(), &entry, buffer.data(), buffer.size(), &found) != 0 || found == nullptr) {
+        return {};
+    }
+    return {true, entry.pw_uid, entry.pw_gid};
+}
+
+std::vector<gid_t> groupsOf(const std::string& user, gid_t first) {
+    int count = 64;
+    std::vector<gid_t> groups(static_cast<std::size_t>(count));
+    if (::getgrouplist(user.c_str(), first, groups.data(), &count) < 0) {
+        groups.resize(static_cast<std::size_t>(count));
+        ::getgrouplist(user.c_str(), first, groups.data(), &count);
+    }
+    groups.resize(static_cast<std::size_t>(count));
+    return groups;
+}
+
+bool isMember(const std::vector<gid_t>& groups, const std::string& group) {
+    struct group entry {};
+    struct group* found = nullptr;
+    std::array<char, 65536> buffer{};
+    if (::getgrnam_r(group.c_str(), &entry, buffer.data(), buffer.size(), &found) != 0 || found == nullptr) {
+        return false;
+    }
+    return std::find(groups.begin(), groups.end(), entry.gr_gid) != groups.end();
+}
+
+}  // namespace
+
+Identity identityOf(const std::string& user, const std::vector<std::string>& readers) {
+    Identity identity{user, false, false};
+    const Account account = findAccount(user);
+    if (!account.known) return identity;
+    const std::vector<gid_t> groups = groupsOf(user, account.gid);
+    identity.isAdministrator = account.uid == 0 || isMember(groups, kAdministrators);
+    identity.mayRead = identity.isAdministrator ||
+                       std::any_of(readers.begin(), readers.end(), [&](const std::string& reader) {
+                           if (reader.starts_with('@')) return isMember(groups, reader.substr(1));
+                           return reader == "*" || reader == user;
+                       });
+    return identity;
+}
+
+std::optional<Identity> PamChecker::check(const Credentials& credentials, const std::string& address) {
+    if (!PamSession(credentials, address).authenticate()) return std::nullopt;
+    return identityOf(credentials.user, m_readers);
+}
+
+}  // namespace host

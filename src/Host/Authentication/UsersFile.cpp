@@ -1,0 +1,144 @@
+#include "Host/Authentication/UsersFile.h"
+
+#include <crypt.h>
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <cerrno>
+#include <cstring>
+#include <fstream>
+#include <sstream>
+#include <stdexcept>
+
+namespace host {
+
+namespace {
+
+[[noreturn]] void fail(const std::string& path, const std::string& why) {
+    throw std::runtime_error(path + ": " + why);
+}
+
+/// Equal without telling by the time it takes where the difference is.
+bool sameHash(std::string_view left, std::string_view right) {
+    int difference = left.size() == right.size() ? 0 : 1;
+    for (std::size_t i = 0; i < std::min(left.size(), right.size()); ++i) {
+        difference |= left[i] ^ right[i];
+    }
+    return difference == 0;
+}
+
+std::string crypted(const std::string& password, const std::string& setting) {
+    const auto data = std::make_unique<crypt_data>();
+    const char* hash = ::crypt_r(password.c_str(), setting.c_str(), data.get());
+    // A failure token begins with an asterisk and equals no hash.
+    return hash == nullptr ? "*" : hash;
+}
+
+UserEntry readEntry(const std::string& path, std::size_t number, const std::string& line, std::string& name) {
+    const std::string where = path + ":" + std::to_string(number);
+    std::istringstream fields(line);
+    UserEntry entry;
+    std::string role;
+    std::getline(fields, name, ':');
+    std::getline(fields, entry.hash, ':');
+    std::getline(fields, role);
+    if (!isUserName(name)) fail(where, "no user name before the first colon");
+    if (!entry.hash.starts_with('$')) fail(where, "no password hash; `quenx-cimd passwd` makes one");
+    if (role != "admin" && role != "reader") fail(where, "the role must be admin or reader");
+    entry.isAdministrator = role == "admin";
+    return entry;
+}
+
+/// The file's owner and mode decide who can let himself in.
+void checkMode(const std::string& path) {
+    struct stat status {};
+    if (::stat(path.c_str(), &status) != 0) fail(path, std::strerror(errno));
+    if (!S_ISREG(status.st_mode)) fail(path, "is no regular file");
+    if ((status.st_mode & 077U) != 0) fail(path, "is open to group or others; chmod 600 it");
+    if (status.st_uid != 0 && status.st_uid != ::geteuid()) {
+        fail(path, "belongs to somebody else than root or the user that the daemon runs as");
+    }
+}
+
+}  // namespace
+
+bool isUserName(const std::string& name) {
+    return !name.empty() && name.size() <= 64 && name.find(':') == std::string::npos && name[0] != '#' &&
+           std::all_of(name.begin(), name.end(), [](char c) { return c > ' ' && c != 0x7F; });
+}
+
+UserEntries readUsersFile(const std::string& path) {
+    checkMode(path);
+    std::ifstream file(path);
+    if (!file) fail(path, "cannot be read");
+    UserEntries users;
+    std::string line;
+    for (std::size_t number = 1; std::getline(file, line); ++number) {
+        if (line.empty() || line[0] == '#') continue;
+        std::string name;
+        UserEntry entry = readEntry(path, number, line, name);
+        if (!users.emplace(name, std::move(entry)).second) {
+            fail(path + ":" + std::to_string(number), "user " + name + " is there twice");
+        }
+    }
+    return users;
+}
+
+void writeUsersFile(const std::string& path, const UserEntries& users) {
+    std::string text = "# name:hash:role, written by `quenx-cimd passwd`\n";
+    for (const auto& [name, entry] : users) {
+        text += name + ":" + entry.hash + ":" + (entry.isAdministrator ? "admin" : "reader") + "\n";
+    }
+    const std::string fresh = path + ".new";
+    ::unlink(fresh.c_str());
+    const int fd = ::open(fresh.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0600);
+    if (fd < 0) fail(fresh, std::strerror(errno));
+    const bool written =
+        ::write(fd, text.data(), text.size()) == static_cast<ssize_t>(text.size()) && ::fsync(fd) == 0;
+    const int error = errno;
+    ::close(fd);
+    if (!written) fail(fresh, std::strerror(error));
+    if (::rename(fresh.c_str(), path.c_str()) != 0) fail(path, std::strerror(errno));
+}
+
+std::string hashPassword(const std::string& password) {
+    char setting[CRYPT_GENSALT_OUTPUT_SIZE];
+    if (::crypt_gensalt_rn(nullptr, 0, nullptr, 0, setting, sizeof setting) == nullptr) {
+        throw std::runtime_error(std::string("no salt for a password: ") + std::strerror(errno));
+    }
+    std::string hash = crypted(password, setting);
+    if (hash.starts_with('*')) throw std::runtime_error("the password cannot be hashed");
+    return hash;
+}
+
+UsersFile::UsersFile(std::string path) : m_path(std::move(path)) {
+    reload();
+}
+
+void UsersFile::reload() {
+    UserEntries users = readUsersFile(m_path);
+    // By the method of the file's own hashes, so that an unknown user costs what a known one does.
+    std::string decoy = users.empty() ? hashPassword("") : users.begin()->second.hash;
+    const utils::Mutex::AutoLocker lock(m_mutex);
+    m_users = std::move(users);
+    m_decoy = std::move(decoy);
+}
+
+UserEntry UsersFile::find(const std::string& name, bool& known) {
+    const utils::Mutex::AutoLocker lock(m_mutex);
+    const auto found = m_users.find(name);
+    known = found != m_users.end();
+    return known ? found->second : UserEntry{m_decoy, false};
+}
+
+std::optional<Identity> UsersFile::check(const Credentials& credentials, const std::string&) {
+    bool known = false;
+    const UserEntry entry = find(credentials.user, known);
+    const bool right = sameHash(crypted(credentials.password, entry.hash), entry.hash);
+    if (!known || !right) return std::nullopt;
+    return Identity{credentials.user, entry.isAdministrator, true};
+}
+
+}  // namespace host

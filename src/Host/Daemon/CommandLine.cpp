@@ -1,0 +1,106 @@
+#include "Host/Daemon/CommandLine.h"
+
+#include <unistd.h>
+
+#include <CLI/CLI.hpp>
+#include <filesystem>
+#include <iostream>
+
+#include "Host/Daemon/SettingsField.h"
+
+namespace host {
+
+namespace {
+
+constexpr const char* kDefaultFile = "/etc/quenx-cimd/quenx-cimd.toml";
+constexpr int kWrongUse = 2;
+
+/// Beside the program as it is built and unpacked, else where it is installed.
+std::string providerDirectory() {
+    std::error_code error;
+    const auto beside =
+        std::filesystem::read_symlink("/proc/self/exe", error).parent_path().parent_path() / "lib";
+    return std::filesystem::exists(beside / "libQuenx_SoftwareUpdate.so", error) ? beside.string()
+                                                                                 : QUENX_PROVIDER_DIR;
+}
+
+/// The texts given for a setting; empty when its option was not used.
+struct GivenOption {
+    SettingsField field;
+    std::vector<std::string> texts;
+};
+
+void addOptions(CLI::App& app, std::vector<GivenOption>& given) {
+    for (GivenOption& each : given) {
+        const std::string help = each.field.help + " [" + each.field.text() + "]";
+        CLI::Option* option = app.add_option(each.field.option(), each.texts, help);
+        option->group("Settings (key " + each.field.key.substr(0, each.field.key.find('.')) +
+                      ".* of the file)");
+        if (each.field.isFlag()) option->expected(0, 1)->default_str("true");
+        if (!each.field.isList() && !each.field.isFlag()) option->expected(1);
+    }
+}
+
+void applyOptions(const std::vector<GivenOption>& given, Settings& settings) {
+    const std::vector<SettingsField> fields = fieldsOf(settings);
+    for (std::size_t i = 0; i < given.size(); ++i) {
+        if (given[i].texts.empty()) continue;
+        if (fields[i].isList()) std::get<std::vector<std::string>*>(fields[i].target)->clear();
+        for (const std::string& text : given[i].texts)
+            fields[i].set(text);
+    }
+}
+
+void readFile(const std::string& named, Settings& settings) {
+    if (!named.empty()) {
+        readSettingsFile(named, settings);
+    } else if (::access(kDefaultFile, F_OK) == 0) {
+        readSettingsFile(kDefaultFile, settings);
+    }
+}
+
+}  // namespace
+
+CommandLine readCommandLine(int argc, const char* const* argv) {
+    CommandLine result;
+    result.settings.providers = providerDirectory();
+    CLI::App app(
+        "Serves firmware updates of Ethernet adapters over CIM-XML.\n"
+        "SIGTERM: take no more requests, answer those in flight, wait for flashes that have begun,\n"
+        "exit 0. A second SIGTERM shortens nothing. SIGHUP: read certificate and users again.\n"
+        "Exit status: 0 done, 1 failed, 2 wrong use or configuration.",
+        "quenx-cimd");
+    app.set_version_flag("--version", QUENX_VERSION);
+    std::string file;
+    app.add_option("--config", file, std::string("configuration file [") + kDefaultFile + " if it is there]");
+    app.add_flag("--check-config", result.checkOnly, "check the configuration and exit");
+    std::vector<GivenOption> given;
+    for (const SettingsField& field : fieldsOf(result.settings))
+        given.push_back({field, {}});
+    addOptions(app, given);
+
+    PasswdRequest passwd;
+    CLI::App* command = app.add_subcommand("passwd", "Set the password of a user in the users file.");
+    command->add_option("USER", passwd.user, "name of the user")->required();
+    command->add_option("--users", passwd.usersFile, "the file [auth.users_file]");
+    command->add_flag("--reader", passwd.isReader, "may read only");
+    command->add_flag("--delete", passwd.remove, "take the user out");
+    try {
+        app.parse(argc, argv);
+        readFile(file, result.settings);
+        applyOptions(given, result.settings);
+        checkSettings(result.settings);
+    } catch (const CLI::ParseError& error) {
+        result.exitStatus = app.exit(error) == 0 ? 0 : kWrongUse;
+    } catch (const std::runtime_error& error) {
+        std::cerr << "quenx-cimd: " << error.what() << '\n';
+        result.exitStatus = kWrongUse;
+    }
+    if (command->parsed()) {
+        if (passwd.usersFile.empty()) passwd.usersFile = result.settings.authentication.usersFile;
+        result.passwd = passwd;
+    }
+    return result;
+}
+
+}  // namespace host

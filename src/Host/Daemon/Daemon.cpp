@@ -1,0 +1,132 @@
+#include "Host/Daemon/Daemon.h"
+
+#include <iostream>
+
+#include "Host/Authentication/PamChecker.h"
+#include "Host/Authentication/UsersFile.h"
+#include "Host/Daemon/RunningJobs.h"
+#include "Host/Operations/InteropNamespace.h"
+#include "Host/Operations/ProviderNamespace.h"
+#include "MidAPI/ma.h"
+#include "Utils/Log.h"
+#include "Utils/Os/Linux/linux.h"
+
+namespace host {
+
+namespace {
+
+/// One write, so that lines of several threads do not mix.
+void say(const std::string& text) {
+    std::cerr << "quenx-cimd: " + text + "\n";
+}
+
+}  // namespace
+
+void report(const std::string& text) {
+    say(text);
+    QUENX_DEBUG_TEXT(text);
+}
+
+void reportProblem(const std::string& text) {
+    say(text);
+    QUENX_ERROR_TEXT(text);
+}
+
+Daemon::Daemon(const Settings& settings) : m_settings(settings) {
+    if (!m_settings.providerConfiguration.empty()) m_configuration.emplace(m_settings.providerConfiguration);
+    if (!m_settings.adapters.empty()) ma::configureSimulator(m_settings.adapters, m_settings.adapterState);
+    loadProviders();
+    m_namespace = utils::SMASHv2Config::getInstance()->getNamespace();
+    m_dispatcher = makeDispatcher();
+    m_authentication = makeAuthentication();
+    m_server = std::make_unique<HttpServer>(m_settings.limits, *m_dispatcher, *m_authentication);
+    listen();
+}
+
+Daemon::~Daemon() = default;
+
+void Daemon::loadProviders() {
+    m_providers.load(m_settings.providers);
+    for (const auto& problem : m_providers.problems()) {
+        reportProblem(problem.file + " is not loaded: " + problem.reason);
+    }
+    if (m_providers.loaded().empty())
+        reportProblem("there is no provider library in " + m_settings.providers);
+}
+
+std::unique_ptr<Dispatcher> Daemon::makeDispatcher() const {
+    const auto implementation = std::make_shared<ProviderNamespace>(m_namespace);
+    Dispatcher::Namespaces namespaces{implementation};
+    std::vector<std::string> names{m_namespace};
+    for (const char* name : {"interop", "root/interop"}) {
+        if (!core::sameName(name, m_namespace)) names.emplace_back(name);
+    }
+    const auto model = std::make_shared<InteropModel>(names, os::getHostname());
+    for (std::size_t i = 1; i < names.size(); ++i) {
+        namespaces.push_back(std::make_shared<InteropNamespace>(names[i], implementation, model));
+    }
+    return std::make_unique<Dispatcher>(std::move(namespaces), m_settings.pulls);
+}
+
+std::unique_ptr<Authentication> Daemon::makeAuthentication() const {
+    const AuthenticationSettings& settings = m_settings.authentication;
+    std::unique_ptr<PasswordChecker> checker;
+    if (settings.method == "users") {
+        checker = std::make_unique<UsersFile>(settings.usersFile);
+    } else {
+        checker = std::make_unique<PamChecker>(settings.readers);
+    }
+    return std::make_unique<Authentication>(std::move(checker), settings.rememberFor);
+}
+
+void Daemon::listenOn(std::uint16_t port, bool tls) {
+    const std::string& address = m_settings.listen.address;
+    Listener listener(address, port);
+    if (!m_places.empty()) m_places += " ";
+    m_places += tls ? "https://" : "http://";
+    m_places += address.find(':') == std::string::npos ? address : "[" + address + "]";
+    m_places += ":" + std::to_string(listener.port());
+    m_server->listen(std::move(listener), tls);
+}
+
+void Daemon::listen() {
+    if (m_settings.listen.https) {
+        if (makeTlsFiles(m_settings.tls.certificate, m_settings.tls.key)) {
+            report("made a self-signed certificate: " + m_settings.tls.certificate);
+        }
+        m_server->setIdentity(
+            std::make_shared<const TlsIdentity>(m_settings.tls.certificate, m_settings.tls.key));
+        listenOn(m_settings.listen.httpsPort, true);
+    }
+    if (m_settings.listen.http) listenOn(m_settings.listen.httpPort, false);
+}
+
+void Daemon::reload() {
+    try {
+        m_authentication->reload();
+    } catch (const std::runtime_error& error) {
+        reportProblem(std::string("the users stay as they were: ") + error.what());
+    }
+    if (!m_settings.listen.https) return;
+    try {
+        m_server->setIdentity(
+            std::make_shared<const TlsIdentity>(m_settings.tls.certificate, m_settings.tls.key));
+    } catch (const std::runtime_error& error) {
+        reportProblem(std::string("the certificate stays as it was: ") + error.what());
+    }
+}
+
+void Daemon::stopAccepting() {
+    m_server->stopAccepting();
+}
+
+std::string Daemon::unfinished() {
+    if (const unsigned int requests = m_server->inFlight(); requests != 0) {
+        return std::to_string(requests) + " requests in flight";
+    }
+    m_dispatcher->shutDown();
+    const std::vector<RunningJob> jobs = runningJobs(core::CimRequests(m_namespace));
+    return jobs.empty() ? "" : "the flash of " + describe(jobs);
+}
+
+}  // namespace host

@@ -1,0 +1,61 @@
+#pragma once
+
+#include <memory>
+#include <optional>
+#include <string>
+
+#include "Framework/ProviderLibraries.h"
+#include "Host/Server/HttpServer.h"
+#include "Host/Settings.h"
+#include "Utils/Os/Linux/LinuxOSLocker.h"
+#include "Utils/Os/Linux/SMASHv2Config.h"
+
+namespace host {
+
+/// The object manager: providers, operations, server. Started by the constructor.
+class Daemon {
+  public:
+    /// Throws std::runtime_error that says what is missing or wrong. A provider library that does not load is
+    /// only reported.
+    explicit Daemon(const Settings& settings);
+    /// Ends connections and unloads the providers, which wait for what they still do.
+    ~Daemon();
+    Daemon(const Daemon&) = delete;
+    Daemon& operator=(const Daemon&) = delete;
+
+    /// Where it listens, for a person: "https://127.0.0.1:5989".
+    const std::string& places() const { return m_places; }
+
+    /// Reads certificate, key and users again. What cannot be read is reported, and stays as it was.
+    void reload();
+
+    /// Takes no more connections.
+    void stopAccepting();
+    /// What a stop still has to wait for, for a person; empty when there is nothing more. First the requests
+    /// in flight, then the flashes that have begun.
+    std::string unfinished();
+
+  private:
+    void loadProviders();
+    std::unique_ptr<Dispatcher> makeDispatcher() const;
+    std::unique_ptr<Authentication> makeAuthentication() const;
+    void listen();
+    void listenOn(std::uint16_t port, bool tls);
+
+    const Settings m_settings;
+    std::string m_places;
+    // Destroyed last to first: the server lets go of its requests before the providers leave.
+    std::optional<utils::SMASHv2Config> m_configuration;
+    os::OSLockerLinux m_locker;
+    core::ProviderLibraries m_providers;
+    std::string m_namespace;
+    std::unique_ptr<Dispatcher> m_dispatcher;
+    std::unique_ptr<Authentication> m_authentication;
+    std::unique_ptr<HttpServer> m_server;
+};
+
+/// Tells a person and the system log.
+void report(const std::string& text);
+void reportProblem(const std::string& text);
+
+}  // namespace host

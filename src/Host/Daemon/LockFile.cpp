@@ -1,0 +1,46 @@
+#include "Host/Daemon/LockFile.h"
+
+#include <fcntl.h>
+#include <sys/file.h>
+#include <unistd.h>
+
+#include <array>
+#include <cerrno>
+#include <cstring>
+#include <stdexcept>
+
+namespace host {
+
+namespace {
+
+std::string holderOf(int file) {
+    std::array<char, 32> text{};
+    const ssize_t length = ::pread(file, text.data(), text.size() - 1, 0);
+    return length <= 0 ? "another process"
+                       : "process " + std::string(text.data(), std::strcspn(text.data(), "\n"));
+}
+
+}  // namespace
+
+LockFile::LockFile(const std::string& path)
+    : m_file(::open(path.c_str(), O_RDWR | O_CREAT | O_CLOEXEC, 0644)) {
+    if (m_file < 0) throw std::runtime_error(path + ": " + std::strerror(errno));
+    if (::flock(m_file, LOCK_EX | LOCK_NB) != 0) {
+        const std::string holder = holderOf(m_file);
+        ::close(m_file);
+        throw std::runtime_error("a daemon is running already: " + path + " is held by " + holder);
+    }
+    // The file stays when we end: removing it would let two others lock two different files.
+    const std::string text = std::to_string(::getpid()) + "\n";
+    if (::ftruncate(m_file, 0) != 0 || ::pwrite(m_file, text.data(), text.size(), 0) < 0) {
+        const int error = errno;
+        ::close(m_file);
+        throw std::runtime_error(path + ": " + std::strerror(error));
+    }
+}
+
+LockFile::~LockFile() {
+    ::close(m_file);
+}
+
+}  // namespace host

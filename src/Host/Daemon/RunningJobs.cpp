@@ -1,0 +1,45 @@
+#include "Host/Daemon/RunningJobs.h"
+
+namespace host {
+
+namespace {
+
+// JobState of CIM_ConcreteJob.
+constexpr std::uint64_t kStarting = 3;
+constexpr std::uint64_t kRunning = 4;
+
+template <class T>
+T valueOf(const core::InstanceValue& instance, std::string_view name) {
+    const core::PropertyValue* property = instance.find(name);
+    const core::CimScalar* scalar = property == nullptr ? nullptr : property->value.scalar();
+    const T* value = scalar == nullptr ? nullptr : std::get_if<T>(scalar);
+    return value == nullptr ? T() : *value;
+}
+
+}  // namespace
+
+std::vector<RunningJob> runningJobs(const core::CimRequests& requests) {
+    std::vector<RunningJob> running;
+    try {
+        for (const core::InstanceValue& job : requests.enumerateInstances("CIM_ConcreteJob")) {
+            const auto state = valueOf<std::uint64_t>(job, "JobState");
+            if (state != kStarting && state != kRunning) continue;
+            running.push_back(
+                {valueOf<std::string>(job, "InstanceID"), valueOf<std::uint64_t>(job, "PercentComplete")});
+        }
+    } catch (const core::CimError&) {
+        // Nobody serves jobs.
+    }
+    return running;
+}
+
+std::string describe(const std::vector<RunningJob>& jobs) {
+    std::string text;
+    for (const RunningJob& job : jobs) {
+        if (!text.empty()) text += ", ";
+        text += job.id + " at " + std::to_string(job.percent) + " %";
+    }
+    return text;
+}
+
+}  // namespace host

@@ -1,0 +1,23 @@
+#pragma once
+
+#include <string>
+#include <vector>
+
+#include "Framework/CimRequests.h"
+
+namespace host {
+
+/// A flash that has begun.
+struct RunningJob {
+    std::string id;
+    std::uint64_t percent = 0;
+};
+
+/// The jobs that the providers are working on: those that serve a CIM_ConcreteJob which is starting or
+/// running. Empty when nobody serves jobs.
+std::vector<RunningJob> runningJobs(const core::CimRequests& requests);
+
+/// "Job#1 at 42 %, Job#2 at 7 %"
+std::string describe(const std::vector<RunningJob>& jobs);
+
+}  // namespace host

@@ -1,0 +1,74 @@
+#include <algorithm>
+
+#include "Host/Operations/ClassElements.h"
+#include "Host/Operations/Handlers.h"
+
+namespace host {
+
+namespace {
+
+using cimxml::IntrinsicResult;
+using cimxml::ResultKind;
+
+ClassOptions optionsOf(const Parameters& parameters) {
+    return {parameters.flag("LocalOnly", true), parameters.flag("IncludeQualifiers", true),
+            parameters.flag("IncludeClassOrigin", false), parameters.list("PropertyList")};
+}
+
+std::vector<core::ClassChain> wantedClasses(const OperationContext& context, const Parameters& parameters) {
+    const std::string className = parameters.className("ClassName");
+    if (parameters.isGiven("ClassName")) context.model.requireClass(className);
+    return context.model.classes(className, parameters.flag("DeepInheritance", false));
+}
+
+}  // namespace
+
+IntrinsicResult getClass(const OperationContext& context, const Parameters& parameters) {
+    IntrinsicResult result;
+    result.kind = ResultKind::Classes;
+    const core::ClassChain chain = context.model.getClass(parameters.className("ClassName"));
+    result.classes.push_back(classElement(chain, optionsOf(parameters)));
+    return result;
+}
+
+IntrinsicResult enumerateClasses(const OperationContext& context, const Parameters& parameters) {
+    IntrinsicResult result;
+    result.kind = ResultKind::Classes;
+    const ClassOptions options = optionsOf(parameters);
+    for (const core::ClassChain& chain : wantedClasses(context, parameters)) {
+        result.classes.push_back(classElement(chain, options));
+    }
+    return result;
+}
+
+IntrinsicResult enumerateClassNames(const OperationContext& context, const Parameters& parameters) {
+    IntrinsicResult result;
+    result.kind = ResultKind::ClassNames;
+    for (const core::ClassChain& chain : wantedClasses(context, parameters)) {
+        result.classNames.push_back(chain.front()->name);
+    }
+    return result;
+}
+
+IntrinsicResult getQualifier(const OperationContext&, const Parameters& parameters) {
+    const std::string name = parameters.text("QualifierName");
+    const auto& known = qualifierDeclarations();
+    const auto found = std::find_if(known.begin(), known.end(),
+                                    [&](const auto& each) { return core::sameName(each.name, name); });
+    if (found == known.end()) {
+        throw core::CimError(core::CimStatus::NotFound, "no qualifier \"" + name + "\"");
+    }
+    IntrinsicResult result;
+    result.kind = ResultKind::Qualifiers;
+    result.qualifiers = {*found};
+    return result;
+}
+
+IntrinsicResult enumerateQualifiers(const OperationContext&, const Parameters&) {
+    IntrinsicResult result;
+    result.kind = ResultKind::Qualifiers;
+    result.qualifiers = qualifierDeclarations();
+    return result;
+}
+
+}  // namespace host

@@ -1,0 +1,38 @@
+#pragma once
+
+#include <atomic>
+#include <memory>
+#include <vector>
+
+#include "Host/CimXml/Request.h"
+#include "Host/CimXml/Response.h"
+#include "Host/Operations/NamespaceModel.h"
+#include "Host/Operations/Operation.h"
+#include "Host/Operations/PullContexts.h"
+
+namespace host {
+
+/// Carries requests to the namespaces and turns every outcome into a response. Thread-safe.
+class Dispatcher {
+  public:
+    using Namespaces = std::vector<std::shared_ptr<const NamespaceModel>>;
+
+    explicit Dispatcher(Namespaces namespaces, const PullLimits& limits = {});
+
+    /// Never throws for what a request asks or a provider does, memory exhaustion included.
+    cimxml::Response dispatch(const cimxml::Request& request, const Caller& caller);
+
+    /// From now on every request is answered with "server is shutting down".
+    void shutDown() { m_shuttingDown.store(true); }
+
+  private:
+    cimxml::IntrinsicResult call(const cimxml::IntrinsicCall& call, const Caller& caller);
+    cimxml::ExtrinsicResult call(const cimxml::MethodCall& call, const Caller& caller);
+    const NamespaceModel& model(const std::string& name) const;
+
+    const Namespaces m_namespaces;
+    PullContexts m_pulls;
+    std::atomic<bool> m_shuttingDown{false};
+};
+
+}  // namespace host

@@ -1,0 +1,33 @@
+#pragma once
+
+#include <string>
+#include <vector>
+
+#include "Framework/CimRequests.h"
+
+namespace host {
+
+/// What the host serves of itself in the interop namespaces: CIM_ObjectManager and one CIM_Namespace for each
+/// namespace. Fixed when built; thread-safe.
+class InteropModel {
+  public:
+    /// The names of all namespaces, and that of the machine.
+    InteropModel(std::vector<std::string> namespaces, std::string systemName);
+
+    /// Empty for a class that is not the host's own.
+    core::ClassChain findClass(const std::string& className) const;
+    /// All of them, superclasses included.
+    std::vector<core::ClassChain> classes() const;
+    /// The instances, with paths in the given namespace.
+    std::vector<core::InstanceValue> instances(const std::string& namespaceName) const;
+
+  private:
+    core::InstanceValue objectManager() const;
+    core::InstanceValue namespaceInstance(const std::string& name) const;
+
+    const std::vector<std::string> m_namespaces;
+    const std::string m_systemName;
+    std::vector<std::shared_ptr<const core::ClassDeclaration>> m_declarations;
+};
+
+}  // namespace host

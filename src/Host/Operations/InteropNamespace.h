@@ -1,0 +1,58 @@
+#pragma once
+
+#include <memory>
+
+#include "Host/Operations/InteropModel.h"
+#include "Host/Operations/NamespaceModel.h"
+
+namespace host {
+
+/// The namespace in which a client finds out what is served: the object manager, the namespaces, and the
+/// registered profiles with what conforms to them and what they refer to. The profiles come from the
+/// providers; here their paths are in this namespace, while those of the elements that conform to them are in
+/// the implementation namespace, where a client goes on.
+class InteropNamespace : public NamespaceModel {
+  public:
+    InteropNamespace(std::string name, std::shared_ptr<const NamespaceModel> implementation,
+                     std::shared_ptr<const InteropModel> model);
+
+    const std::string& name() const override { return m_name; }
+    std::vector<core::InstanceValue> enumerateInstances(const std::string& className,
+                                                        const core::PropertyFilter& filter) const override;
+    std::vector<core::CimPath> enumerateInstanceNames(const std::string& className) const override;
+    core::InstanceValue getInstance(const core::CimPath& path,
+                                    const core::PropertyFilter& filter) const override;
+    std::vector<core::InstanceValue> associators(const core::CimPath& path, const core::AssociationFilter& by,
+                                                 const core::PropertyFilter& filter) const override;
+    std::vector<core::CimPath> associatorNames(const core::CimPath& path,
+                                               const core::AssociationFilter& by) const override;
+    std::vector<core::InstanceValue> references(const core::CimPath& path, const core::AssociationFilter& by,
+                                                const core::PropertyFilter& filter) const override;
+    std::vector<core::CimPath> referenceNames(const core::CimPath& path,
+                                              const core::AssociationFilter& by) const override;
+    /// No class here has methods.
+    core::MethodResult invokeMethod(const core::CimPath& path, const std::string& method,
+                                    const std::vector<core::Argument>& arguments) const override;
+    void deleteInstance(const core::CimPath& path) const override;
+    core::ClassChain getClass(const std::string& className) const override;
+    std::vector<core::ClassChain> classes(const std::string& className, bool deep) const override;
+    bool knowsClass(const std::string& className) const override {
+        return NamespaceModel::knowsClass(className) || m_implementation->knowsClass(className);
+    }
+
+  private:
+    /// Whether the providers' class is shown here.
+    bool isShown(const core::ClassChain& chain) const;
+    /// The providers' classes to enumerate for the instances of a class here.
+    std::vector<std::string> sources(const std::string& className) const;
+    core::CimPath relocated(const core::CimPath& path) const;
+    core::InstanceValue relocated(core::InstanceValue instance) const;
+    std::vector<core::CimPath> relocated(const std::vector<core::CimPath>& paths) const;
+    std::vector<core::InstanceValue> relocated(std::vector<core::InstanceValue> instances) const;
+
+    const std::string m_name;
+    const std::shared_ptr<const NamespaceModel> m_implementation;
+    const std::shared_ptr<const InteropModel> m_model;
+};
+
+}  // namespace host

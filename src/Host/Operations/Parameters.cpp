@@ -1,0 +1,119 @@
+#include "Host/Operations/Parameters.h"
+
+#include <algorithm>
+
+namespace host {
+
+namespace {
+
+using cimxml::Parameter;
+using cimxml::ParameterValue;
+using core::CimType;
+
+[[noreturn]] void refuse(const std::string& text) {
+    throw core::CimError(core::CimStatus::InvalidParameter, text);
+}
+
+bool isOfKind(ParameterKind kind, const ParameterValue& value) {
+    const auto* text = std::get_if<std::string>(&value);
+    switch (kind) {
+        case ParameterKind::ClassName:
+            return std::holds_alternative<cimxml::ClassName>(value);
+        case ParameterKind::InstanceName:
+            return std::holds_alternative<core::CimPath>(value);
+        case ParameterKind::ObjectName:
+            return std::holds_alternative<core::CimPath>(value) ||
+                   std::holds_alternative<cimxml::ClassName>(value);
+        case ParameterKind::Boolean:
+            return text != nullptr && core::parseScalar(CimType::Boolean, *text).has_value();
+        case ParameterKind::Number:
+            return text != nullptr && core::parseScalar(CimType::Uint32, *text).has_value();
+        case ParameterKind::Text:
+            return text != nullptr;
+        case ParameterKind::TextList:
+            return text != nullptr || std::holds_alternative<std::vector<std::string>>(value);
+        case ParameterKind::Instance:
+            return std::holds_alternative<cimxml::InstanceBody>(value);
+    }
+    return false;
+}
+
+bool isNull(const ParameterValue& value) {
+    return std::holds_alternative<std::monostate>(value);
+}
+
+}  // namespace
+
+Parameters::Parameters(const cimxml::IntrinsicCall& call, std::span<const ParameterSpec> allowed)
+    : m_call(call) {
+    for (const Parameter& parameter : call.parameters) {
+        const auto same = [&](const auto& other) { return core::sameName(other.name, parameter.name); };
+        const auto known = std::find_if(allowed.begin(), allowed.end(), same);
+        if (known == allowed.end()) refuse(call.operation + " has no parameter " + parameter.name);
+        const auto first = std::find_if(call.parameters.begin(), call.parameters.end(), same);
+        if (&*first != &parameter) refuse(parameter.name + " is given twice");
+        if (!isNull(parameter.value) && !isOfKind(known->kind, parameter.value)) {
+            refuse(parameter.name + " is a value of another kind");
+        }
+    }
+    for (const ParameterSpec& known : allowed) {
+        if (known.required && !isGiven(known.name)) refuse(std::string(known.name) + " is missing");
+    }
+}
+
+const ParameterValue* Parameters::find(std::string_view name) const {
+    for (const Parameter& parameter : m_call.parameters) {
+        if (core::sameName(parameter.name, name)) return isNull(parameter.value) ? nullptr : &parameter.value;
+    }
+    return nullptr;
+}
+
+bool Parameters::flag(std::string_view name, bool otherwise) const {
+    const ParameterValue* value = find(name);
+    if (value == nullptr) return otherwise;
+    return std::get<bool>(*core::parseScalar(CimType::Boolean, std::get<std::string>(*value)));
+}
+
+std::optional<std::uint32_t> Parameters::number(std::string_view name) const {
+    const ParameterValue* value = find(name);
+    if (value == nullptr) return std::nullopt;
+    const auto scalar = core::parseScalar(CimType::Uint32, std::get<std::string>(*value));
+    return static_cast<std::uint32_t>(std::get<std::uint64_t>(*scalar));
+}
+
+std::string Parameters::text(std::string_view name) const {
+    const ParameterValue* value = find(name);
+    return value == nullptr ? "" : std::get<std::string>(*value);
+}
+
+std::string Parameters::className(std::string_view name) const {
+    const ParameterValue* value = find(name);
+    return value == nullptr ? "" : std::get<cimxml::ClassName>(*value).name;
+}
+
+core::PropertyFilter Parameters::list(std::string_view name) const {
+    const ParameterValue* value = find(name);
+    if (value == nullptr) return std::nullopt;
+    // A list of one may come as the one.
+    if (const auto* text = std::get_if<std::string>(value)) return core::PropertyFilter({*text});
+    return std::get<std::vector<std::string>>(*value);
+}
+
+core::CimPath Parameters::path(std::string_view name) const {
+    const ParameterValue* value = find(name);
+    if (value == nullptr) return {};
+    const auto* path = std::get_if<core::CimPath>(value);
+    return path != nullptr ? *path : core::CimPath(className(name), {});
+}
+
+const cimxml::InstanceBody* Parameters::instance(std::string_view name) const {
+    const ParameterValue* value = find(name);
+    return value == nullptr ? nullptr : std::get_if<cimxml::InstanceBody>(value);
+}
+
+bool Parameters::isClassName(std::string_view name) const {
+    const ParameterValue* value = find(name);
+    return value != nullptr && std::holds_alternative<cimxml::ClassName>(*value);
+}
+
+}  // namespace host

@@ -1,0 +1,150 @@
+#include "Host/Server/HttpServer.h"
+
+#include <microhttpd.h>
+#include <unistd.h>
+
+#include <cstdarg>
+#include <cstdio>
+#include <stdexcept>
+
+#include "Host/Server/Exchange.h"
+#include "Utils/Log.h"
+
+namespace host {
+
+namespace {
+
+constexpr const char* kTlsPriorities = "NORMAL:-VERS-ALL:+VERS-TLS1.3:+VERS-TLS1.2";
+
+/// What the function below shows; old ones live as long as their server.
+std::atomic<const TlsIdentity*> currentIdentity{nullptr};
+
+int retrieveCertificate(gnutls_session_t, const gnutls_datum_t*, int, const gnutls_pk_algorithm_t*, int,
+                        gnutls_pcert_st** certificates, unsigned int* count, gnutls_privkey_t* key) {
+    const TlsIdentity* identity = currentIdentity.load();
+    if (identity == nullptr) return -1;
+    *certificates = identity->certificates();
+    *count = identity->certificateCount();
+    *key = identity->key();
+    return 0;
+}
+
+int socketOf(MHD_Connection* connection) {
+    return ::MHD_get_connection_info(connection, MHD_CONNECTION_INFO_CONNECTION_FD)->connect_fd;
+}
+
+void logLibrary(void*, const char* format, va_list arguments) __attribute__((format(printf, 2, 0)));
+void logLibrary(void*, const char* format, va_list arguments) {
+    char line[512];
+    std::vsnprintf(line, sizeof line, format, arguments);
+    QUENX_DEBUG("http: %s", line);
+}
+
+}  // namespace
+
+/// What the HTTP library calls. No exception may pass through it.
+struct HttpServer::Callbacks {
+    static MHD_Result request(void* server, MHD_Connection* connection, const char*, const char* method,
+                              const char*, const char* data, std::size_t* size, void** state) {
+        try {
+            if (*state == nullptr) {
+                auto exchange =
+                    std::make_unique<Exchange>(*static_cast<HttpServer*>(server), connection, method);
+                *state = exchange.get();
+                return exchange.release()->begin();
+            }
+            auto& exchange = *static_cast<Exchange*>(*state);
+            if (*size == 0) return exchange.finish();
+            exchange.take(data, *size);
+            *size = 0;
+            return MHD_YES;
+        } catch (const std::exception& error) {
+            QUENX_ERROR("a request failed: %s", error.what());
+            return MHD_NO;
+        }
+    }
+
+    static void completed(void* server, MHD_Connection* connection, void** state,
+                          MHD_RequestTerminationCode code) {
+        auto& self = *static_cast<HttpServer*>(server);
+        const std::unique_ptr<Exchange> exchange(static_cast<Exchange*>(*state));
+        *state = nullptr;
+        if (exchange && code == MHD_REQUEST_TERMINATED_COMPLETED_OK) exchange->drain();
+        self.m_watch->idle(socketOf(connection), self.m_limits.idleTime + self.m_limits.headerTime);
+    }
+
+    static void connection(void* server, MHD_Connection* connection, void**,
+                           MHD_ConnectionNotificationCode code) {
+        auto& self = *static_cast<HttpServer*>(server);
+        if (code == MHD_CONNECTION_NOTIFY_STARTED) {
+            self.m_watch->opened(socketOf(connection), self.m_limits.headerTime);
+        } else {
+            self.m_watch->closed(socketOf(connection));
+        }
+    }
+};
+
+HttpServer::HttpServer(const ServerLimits& limits, Dispatcher& dispatcher, Authentication& authentication)
+    : m_limits(limits),
+      m_dispatcher(dispatcher),
+      m_authentication(authentication),
+      m_workers(limits.workers),
+      m_watch(std::make_unique<ConnectionWatch>()) {}
+
+HttpServer::~HttpServer() {
+    close();
+}
+
+void HttpServer::setIdentity(std::shared_ptr<const TlsIdentity> identity) {
+    currentIdentity.store(identity.get());
+    m_identities.push_back(std::move(identity));
+}
+
+void HttpServer::listen(Listener listener, bool tls) {
+    constexpr unsigned int kFlags = MHD_USE_INTERNAL_POLLING_THREAD | MHD_USE_THREAD_PER_CONNECTION |
+                                    MHD_USE_POLL | MHD_USE_ITC | MHD_USE_ERROR_LOG;
+    unsigned int flags = kFlags;
+    if (tls) flags |= MHD_USE_TLS;
+    const std::uint16_t port = listener.port();
+    // The logger comes first, so that complaints about the others reach it.
+    std::vector<MHD_OptionItem> options{
+        {MHD_OPTION_EXTERNAL_LOGGER, reinterpret_cast<intptr_t>(&logLibrary), nullptr},
+        {MHD_OPTION_LISTEN_SOCKET, listener.release(), nullptr},
+        {MHD_OPTION_NOTIFY_COMPLETED, reinterpret_cast<intptr_t>(&Callbacks::completed), this},
+        {MHD_OPTION_NOTIFY_CONNECTION, reinterpret_cast<intptr_t>(&Callbacks::connection), this},
+        {MHD_OPTION_CONNECTION_LIMIT, m_limits.connections, nullptr},
+        {MHD_OPTION_PER_IP_CONNECTION_LIMIT, m_limits.connectionsPerAddress, nullptr},
+        {MHD_OPTION_CONNECTION_TIMEOUT, static_cast<intptr_t>(m_limits.idleTime.count()), nullptr},
+        {MHD_OPTION_CONNECTION_MEMORY_LIMIT, static_cast<intptr_t>(m_limits.headerBytes), nullptr},
+        {MHD_OPTION_STRICT_FOR_CLIENT, 1, nullptr}};
+    if (tls) {
+        options.push_back({MHD_OPTION_HTTPS_CERT_CALLBACK, 0, reinterpret_cast<void*>(&retrieveCertificate)});
+        options.push_back({MHD_OPTION_HTTPS_PRIORITIES, 0, const_cast<char*>(kTlsPriorities)});
+    }
+    options.push_back({MHD_OPTION_END, 0, nullptr});
+    MHD_Daemon* daemon = ::MHD_start_daemon(flags, port, nullptr, nullptr, &Callbacks::request, this,
+                                            MHD_OPTION_ARRAY, options.data(), MHD_OPTION_END);
+    if (daemon == nullptr) throw std::runtime_error("the HTTP server cannot be started");
+    m_daemons.push_back(daemon);
+}
+
+void HttpServer::stopAccepting() {
+    m_stopping.store(true);
+    for (MHD_Daemon* daemon : m_daemons) {
+        const int socket = ::MHD_quiesce_daemon(daemon);
+        if (socket >= 0) ::close(socket);
+    }
+    m_watch->endIdle();
+}
+
+void HttpServer::close() {
+    if (!m_stopping.load()) stopAccepting();
+    m_authentication.stop();
+    for (MHD_Daemon* daemon : m_daemons)
+        ::MHD_stop_daemon(daemon);
+    m_daemons.clear();
+    m_watch.reset();
+    currentIdentity.store(nullptr);
+}
+
+}  // namespace host

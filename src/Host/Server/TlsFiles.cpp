@@ -1,0 +1,131 @@
+// Making a key and a self-signed certificate.
+#include <fcntl.h>
+#include <gnutls/crypto.h>
+#include <gnutls/x509.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <array>
+#include <cerrno>
+#include <cstring>
+#include <ctime>
+#include <filesystem>
+#include <stdexcept>
+
+#include "Host/Server/TlsIdentity.h"
+#include "Utils/Os/Linux/linux.h"
+
+namespace host {
+
+namespace {
+
+namespace fs = std::filesystem;
+
+constexpr std::time_t kDay = 24 * 60 * 60;
+constexpr std::time_t kLifetime = 3650 * kDay;
+
+void check(int status) {
+    if (status < 0)
+        throw std::runtime_error(std::string("making a certificate: ") + ::gnutls_strerror(status));
+}
+
+struct KeyCloser {
+    void operator()(gnutls_x509_privkey_t key) const { ::gnutls_x509_privkey_deinit(key); }
+};
+struct CertificateCloser {
+    void operator()(gnutls_x509_crt_t certificate) const { ::gnutls_x509_crt_deinit(certificate); }
+};
+using Key = std::unique_ptr<std::remove_pointer_t<gnutls_x509_privkey_t>, KeyCloser>;
+using Certificate = std::unique_ptr<std::remove_pointer_t<gnutls_x509_crt_t>, CertificateCloser>;
+
+Key makeKey() {
+    gnutls_x509_privkey_t raw = nullptr;
+    check(::gnutls_x509_privkey_init(&raw));
+    Key key(raw);
+    check(::gnutls_x509_privkey_generate(raw, GNUTLS_PK_ECDSA,
+                                         GNUTLS_CURVE_TO_BITS(GNUTLS_ECC_CURVE_SECP256R1), 0));
+    return key;
+}
+
+void addName(gnutls_x509_crt_t certificate, gnutls_x509_subject_alt_name_t type, std::string_view name) {
+    check(::gnutls_x509_crt_set_subject_alt_name(certificate, type, name.data(),
+                                                 static_cast<unsigned int>(name.size()), GNUTLS_FSAN_APPEND));
+}
+
+void addNames(gnutls_x509_crt_t certificate) {
+    const std::string host = os::getHostname();
+    check(::gnutls_x509_crt_set_dn_by_oid(certificate, GNUTLS_OID_X520_COMMON_NAME, 0, host.data(),
+                                          static_cast<unsigned int>(host.size())));
+    addName(certificate, GNUTLS_SAN_DNSNAME, host);
+    addName(certificate, GNUTLS_SAN_DNSNAME, "localhost");
+    addName(certificate, GNUTLS_SAN_IPADDRESS, std::string_view("\x7F\0\0\1", 4));
+    addName(certificate, GNUTLS_SAN_IPADDRESS, std::string_view("\0\0\0\0\0\0\0\0\0\0\0\0\0\0\0\1", 16));
+}
+
+void addSerial(gnutls_x509_crt_t certificate) {
+    std::array<unsigned char, 16> serial{};
+    check(::gnutls_rnd(GNUTLS_RND_NONCE, serial.data(), serial.size()));
+    serial[0] &= 0x7FU;  // a positive number (RFC 5280 4.1.2.2)
+    check(::gnutls_x509_crt_set_serial(certificate, serial.data(), serial.size()));
+}
+
+Certificate makeCertificate(gnutls_x509_privkey_t key) {
+    gnutls_x509_crt_t raw = nullptr;
+    check(::gnutls_x509_crt_init(&raw));
+    Certificate certificate(raw);
+    check(::gnutls_x509_crt_set_version(raw, 3));
+    addSerial(raw);
+    addNames(raw);
+    const std::time_t now = std::time(nullptr);
+    check(::gnutls_x509_crt_set_activation_time(raw, now - kDay));
+    check(::gnutls_x509_crt_set_expiration_time(raw, now + kLifetime));
+    check(::gnutls_x509_crt_set_key(raw, key));
+    check(::gnutls_x509_crt_set_basic_constraints(raw, 0, -1));
+    check(::gnutls_x509_crt_set_key_usage(raw, GNUTLS_KEY_DIGITAL_SIGNATURE));
+    check(::gnutls_x509_crt_set_key_purpose_oid(raw, GNUTLS_KP_TLS_WWW_SERVER, 0));
+    check(::gnutls_x509_crt_sign2(raw, raw, key, GNUTLS_DIG_SHA256, 0));
+    return certificate;
+}
+
+void writeFile(const std::string& path, const gnutls_datum_t& content, mode_t mode) {
+    const int fd = ::open(path.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, mode);
+    if (fd < 0) throw std::runtime_error(path + ": " + std::strerror(errno));
+    const ssize_t written = ::write(fd, content.data, content.size);
+    const int error = errno;
+    ::close(fd);
+    if (written != static_cast<ssize_t>(content.size)) {
+        ::unlink(path.c_str());
+        throw std::runtime_error(path + ": " + std::strerror(error));
+    }
+}
+
+template <class Object, class Export>
+void writePem(const std::string& path, const Object& object, Export&& exporter, mode_t mode) {
+    gnutls_datum_t pem{nullptr, 0};
+    check(exporter(object, GNUTLS_X509_FMT_PEM, &pem));
+    const std::unique_ptr<unsigned char, void (*)(void*)> holder(pem.data, ::gnutls_free);
+    writeFile(path, pem, mode);
+}
+
+}  // namespace
+
+bool makeTlsFiles(const std::string& certificateFile, const std::string& keyFile) {
+    const bool hasCertificate = fs::exists(certificateFile);
+    const bool hasKey = fs::exists(keyFile);
+    if (hasCertificate && hasKey) return false;
+    if (hasCertificate || hasKey) {
+        throw std::runtime_error((hasKey ? certificateFile : keyFile) + " is missing, but " +
+                                 (hasKey ? keyFile : certificateFile) +
+                                 " is there: give both, or neither to have them made");
+    }
+    for (const std::string& file : {certificateFile, keyFile}) {
+        if (fs::path(file).has_parent_path()) fs::create_directories(fs::path(file).parent_path());
+    }
+    const Key key = makeKey();
+    const Certificate certificate = makeCertificate(key.get());
+    writePem(keyFile, key.get(), ::gnutls_x509_privkey_export2, 0600);
+    writePem(certificateFile, certificate.get(), ::gnutls_x509_crt_export2, 0644);
+    return true;
+}
+
+}  // namespace host

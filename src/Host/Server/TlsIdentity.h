@@ -1,0 +1,42 @@
+#pragma once
+
+#include <gnutls/abstract.h>
+
+#include <memory>
+#include <string>
+
+namespace host {
+
+/// A certificate chain with its private key, as TLS presents it. Does not change once read.
+class TlsIdentity {
+  public:
+    /// Reads PEM files. Throws std::runtime_error that names the file and what is wrong, also when key and
+    /// certificate do not belong together.
+    TlsIdentity(const std::string& certificateFile, const std::string& keyFile);
+    ~TlsIdentity();
+    TlsIdentity(const TlsIdentity&) = delete;
+    TlsIdentity& operator=(const TlsIdentity&) = delete;
+
+    gnutls_pcert_st* certificates() const { return const_cast<gnutls_pcert_st*>(m_certificates); }
+    unsigned int certificateCount() const { return m_count; }
+    gnutls_privkey_t key() const { return m_key; }
+
+  private:
+    static constexpr unsigned int kMostCertificates = 8;
+
+    void readCertificates(const std::string& file);
+    void readKey(const std::string& file);
+    void checkPair(const std::string& certificateFile, const std::string& keyFile) const;
+    void release() noexcept;
+
+    gnutls_pcert_st m_certificates[kMostCertificates]{};
+    unsigned int m_count = 0;
+    gnutls_privkey_t m_key = nullptr;
+};
+
+/// Makes a key (mode 0600) and a self-signed certificate for this machine's names where neither file exists,
+/// folder included; true when it did. The certificate is good for loopback and the machine's name, for ten
+/// years. Throws std::runtime_error, also when only one of the two is there.
+bool makeTlsFiles(const std::string& certificateFile, const std::string& keyFile);
+
+}  // namespace host

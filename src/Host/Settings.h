@@ -1,0 +1,61 @@
+#pragma once
+
+#include <chrono>
+#include <cstddef>
+#include <cstdint>
+#include <string>
+#include <vector>
+
+#include "Host/Operations/PullContexts.h"
+
+namespace host {
+
+/// Everything that bounds what clients can make the daemon spend. All have options.
+struct ServerLimits {
+    std::size_t bodyBytes = 1U << 20;            ///< of one request
+    std::size_t anonymousBodyBytes = 16U << 10;  ///< read, to be polite, of one that is refused
+    std::size_t headerBytes = 32U << 10;         ///< of one request, buffers of the connection included
+    unsigned int connections = 256;              ///< and so connection threads
+    unsigned int connectionsPerAddress = 64;
+    unsigned int workers = 16;             ///< requests carried out at a time
+    std::chrono::seconds headerTime{10};   ///< from the connection, or the end of idling, to the last header
+    std::chrono::seconds requestTime{30};  ///< for a body to arrive, and for an answer to be taken
+    std::chrono::seconds idleTime{60};     ///< between requests
+};
+
+struct ListenSettings {
+    std::string address = "127.0.0.1";
+    std::uint16_t httpsPort = 5989;
+    std::uint16_t httpPort = 5988;
+    bool https = true;
+    bool http = false;  ///< plain, for loopback and tests; passwords travel readable
+};
+
+struct TlsSettings {
+    std::string certificate = "/etc/quenx-cimd/cert.pem";
+    std::string key = "/etc/quenx-cimd/key.pem";
+};
+
+struct AuthenticationSettings {
+    std::string method = "pam";  ///< "pam" or "users"
+    std::string usersFile = "/etc/quenx-cimd/users";
+    /// With PAM: who may read besides the administrators; names, "@group" or "*" for everybody.
+    std::vector<std::string> readers;
+    std::chrono::seconds rememberFor{60};  ///< verified credentials; 0 remembers none
+};
+
+/// What the configuration file and the options say. Field by field documented in packaging/quenx-cimd.toml.
+struct Settings {
+    ListenSettings listen;
+    TlsSettings tls;
+    AuthenticationSettings authentication;
+    ServerLimits limits;
+    PullLimits pulls;
+    std::string providers;              ///< directory of the provider libraries
+    std::string providerConfiguration;  ///< empty: the providers' own default
+    std::string adapters;               ///< description of simulated adapters; empty: default
+    std::string adapterState;           ///< their state directory; empty: default
+    std::string lockFile = "/run/quenx-cimd.lock";
+};
+
+}  // namespace host

@@ -1,0 +1,97 @@
+#include <pthread.h>
+
+#include <cerrno>
+#include <csignal>
+#include <ctime>
+#include <exception>
+#include <iostream>
+
+#include "Host/Daemon/CommandLine.h"
+#include "Host/Daemon/ConfigCheck.h"
+#include "Host/Daemon/Daemon.h"
+#include "Host/Daemon/LockFile.h"
+#include "Host/Daemon/PasswdCommand.h"
+#include "Host/Daemon/ServiceManager.h"
+
+namespace {
+
+constexpr unsigned int kMoreSeconds = 30;
+
+/// The signals that the main thread waits for, and no thread is interrupted by.
+class Signals {
+  public:
+    Signals() {
+        ::sigemptyset(&m_set);
+        for (const int signal : {SIGTERM, SIGINT, SIGHUP})
+            ::sigaddset(&m_set, signal);
+        ::pthread_sigmask(SIG_BLOCK, &m_set, nullptr);
+        std::signal(SIGPIPE, SIG_IGN);
+    }
+
+    int wait() const {
+        int signal = 0;
+        while (::sigwait(&m_set, &signal) != 0) {
+        }
+        return signal;
+    }
+    /// 0 when none came in half a second.
+    int waitBriefly() const {
+        const timespec patience{0, 500000000};
+        const int signal = ::sigtimedwait(&m_set, nullptr, &patience);
+        return signal < 0 ? 0 : signal;
+    }
+
+  private:
+    sigset_t m_set{};
+};
+
+void serve(host::Daemon& daemon, const Signals& signals) {
+    host::ServiceManager::ready("serving " + daemon.places());
+    host::report("serving " + daemon.places());
+    while (signals.wait() == SIGHUP) {
+        host::ServiceManager::reloading();
+        daemon.reload();
+        host::ServiceManager::ready("serving " + daemon.places());
+        host::report("read certificate and users again");
+    }
+}
+
+void stop(host::Daemon& daemon, const Signals& signals) {
+    host::report("stopping");
+    host::ServiceManager::stopping("stopping");
+    daemon.stopAccepting();
+    std::string said;
+    for (std::string rest = daemon.unfinished(); !rest.empty(); rest = daemon.unfinished()) {
+        if (rest != said) host::report("waiting for " + rest);
+        said = rest;
+        host::ServiceManager::stillStopping("waiting for " + rest, kMoreSeconds);
+        // An adapter that is written to half is worse than a slow stop.
+        if (signals.waitBriefly() != 0) host::report("asked again to stop; still waiting for " + rest);
+    }
+}
+
+int run(const host::Settings& settings) {
+    // Before any thread starts, so that all of them inherit the mask.
+    const Signals signals;
+    try {
+        const host::LockFile lock(settings.lockFile);
+        host::Daemon daemon(settings);
+        serve(daemon, signals);
+        stop(daemon, signals);
+    } catch (const std::exception& error) {
+        host::reportProblem(error.what());
+        return 1;
+    }
+    host::report("stopped");
+    return 0;
+}
+
+}  // namespace
+
+int main(int argc, char** argv) {
+    const host::CommandLine command = host::readCommandLine(argc, argv);
+    if (command.exitStatus) return *command.exitStatus;
+    if (command.passwd) return host::runPasswd(*command.passwd);
+    if (command.checkOnly) return host::checkConfiguration(command.settings);
+    return run(command.settings);
+}

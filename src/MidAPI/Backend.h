@@ -1,0 +1,41 @@
+#pragma once
+
+#include <cstdint>
+#include <string>
+#include <vector>
+
+#include "MidAPI/AdapterTypes.h"
+#include "Utils/Export.h"
+#include "Utils/FirmwareTypes.h"
+#include "Utils/StringArray.h"
+
+namespace ma {
+
+/// One way to reach adapters: the operations of ma.h, which is where each one's contract stands. Every
+/// operation may be called from any thread, also for a port that another thread is writing to.
+class QUENX_EXPORT Backend {
+  public:
+    Backend() = default;
+    Backend(const Backend&) = delete;
+    Backend& operator=(const Backend&) = delete;
+    virtual ~Backend();
+
+    virtual utils::StringArray enumerateAdapters() = 0;
+    virtual utils::PCIAddr getPCIAddress(const std::string& adapter) = 0;
+    virtual bool getCanBeUpdated(const std::string& adapter) = 0;
+    virtual bool getAdapterFirmwareVersion(const std::string& adapter,
+                                           std::vector<utils::FirmwareVersionInfo>& components) = 0;
+    virtual int prepareFlashImage(const std::string& adapter, const uint8_t* file, uint32_t fileSize,
+                                  uint8_t* output, uint32_t* imageSize,
+                                  std::vector<utils::FirmwareType>& types) = 0;
+    virtual bool writeFlashImage(const std::string& adapter, const uint8_t* image, uint32_t imageSize,
+                                 uint32_t& errorCode, std::string& errorText) = 0;
+    virtual bool updateCapabilityWord(const std::string& adapter,
+                                      const std::vector<utils::FirmwareType>& types, uint32_t& errorCode,
+                                      std::string& errorText) = 0;
+    virtual uint16_t getFlashImageUpdateProgress(const std::string& adapter) = 0;
+    virtual bool setBootType(const std::string& adapter, BootType type) = 0;
+    virtual AdapterInfo getAdapterInfo(const std::string& adapter) = 0;
+};
+
+}  // namespace ma

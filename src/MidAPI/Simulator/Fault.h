@@ -1,0 +1,95 @@
+#pragma once
+
+#include <cstdint>
+#include <string>
+#include <vector>
+
+#include "MidAPI/AdapterError.h"
+#include "Utils/Export.h"
+#include "Utils/Os/Linux/Mutex.h"
+#include "Utils/ThreadAnnotations.h"
+
+namespace ma {
+
+/// The operations of an adapter at which a fault can strike.
+enum class Operation {
+    Enumerate,
+    PciAddress,
+    FirmwareVersion,
+    Prepare,
+    Write,
+    CapabilityWord,
+    BootType,
+    Info
+};
+
+/// One thing that goes wrong on order.
+struct Fault {
+    enum class Action {
+        Fail,       ///< the operation reports failure with `code` and `text` (Prepare: `code` is the status)
+        Throw,      ///< it throws AdapterError with `text`
+        Stall,      ///< it takes `milliseconds` longer
+        PowerLoss,  ///< it throws PowerLoss and leaves the files as they are at that moment
+        Kill,       ///< the process gets SIGKILL
+    };
+
+    Operation at = Operation::Write;
+    Action action = Action::Fail;
+    uint16_t percent = 0;  ///< Write only: strikes when the progress has reached this, 0 to 100
+    uint32_t code = 0;
+    std::string text{};
+    uint32_t milliseconds = 0;
+    bool once = false;  ///< strikes one time only, instead of at every such operation
+};
+
+/// The power of a simulated adapter failed in the middle of an operation.
+class QUENX_EXPORT PowerLoss : public AdapterError {
+  public:
+    explicit PowerLoss(const std::string& text);
+    ~PowerLoss() override;
+};
+
+/// How a fault of Action::Fail travels inside the simulator.
+struct OrderedFailure {
+    uint32_t code;
+    std::string text;
+};
+
+/// The faults of one adapter. Thread-safe.
+class FaultList {
+  public:
+    explicit FaultList(std::vector<Fault> faults);
+
+    void add(Fault fault);
+    void clear();
+
+  private:
+    struct Entry {
+        uint64_t id;
+        Fault fault;
+    };
+    friend class FaultRun;
+
+    std::vector<Entry> armed(Operation operation);
+    /// Uses a fault up when it is a one-shot; false when another operation was faster.
+    bool take(const Entry& entry);
+
+    utils::Mutex m_mutex;
+    std::vector<Entry> m_entries QUENX_GUARDED_BY(m_mutex);
+    uint64_t m_nextId QUENX_GUARDED_BY(m_mutex) = 0;
+};
+
+/// The faults that may strike during one operation, each at most once.
+class FaultRun {
+  public:
+    FaultRun(FaultList& list, Operation operation);
+
+    /// Lets those strike whose percentage is reached. Throws OrderedFailure, AdapterError or PowerLoss.
+    void reach(unsigned percent = 100);
+
+  private:
+    FaultList& m_list;
+    std::vector<FaultList::Entry> m_pending;
+};
+
+}  // namespace ma

@@ -1,0 +1,68 @@
+#include "MidAPI/Simulator/FlashFiles.h"
+
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <cstdio>
+#include <system_error>
+
+#include "Utils/Os/Linux/Descriptor.h"
+
+namespace ma {
+namespace {
+
+constexpr mode_t FOLDER_MODE = 0755;
+constexpr mode_t FILE_MODE = 0644;
+
+[[noreturn]] void fail(const std::string& what) {
+    throw FlashError(what + ": " + std::generic_category().message(errno));
+}
+
+}  // namespace
+
+FlashError::FlashError(const std::string& text) : std::runtime_error(text) {}
+FlashError::~FlashError() = default;
+
+FlashFiles::~FlashFiles() = default;
+
+void FlashFiles::makeFolder(const std::string& path) {
+    if (::mkdir(path.c_str(), FOLDER_MODE) != 0 && errno != EEXIST) fail("cannot make the folder " + path);
+}
+
+int FlashFiles::create(const std::string& path) {
+    const int descriptor =
+        ::open(path.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC | O_NOFOLLOW, FILE_MODE);
+    if (descriptor < 0) fail("cannot write the file " + path);
+    return descriptor;
+}
+
+void FlashFiles::write(int descriptor, std::span<const uint8_t> bytes) {
+    while (!bytes.empty()) {
+        const ssize_t written = ::write(descriptor, bytes.data(), bytes.size());
+        if (written < 0 && errno == EINTR) continue;
+        if (written < 0) fail("cannot write to the flash");
+        bytes = bytes.subspan(static_cast<std::size_t>(written));
+    }
+}
+
+void FlashFiles::sync(int descriptor) {
+    if (::fsync(descriptor) != 0) fail("cannot bring the flash to the medium");
+}
+
+void FlashFiles::rename(const std::string& from, const std::string& to) {
+    if (::rename(from.c_str(), to.c_str()) != 0) fail("cannot rename " + from);
+}
+
+void FlashFiles::syncFolder(const std::string& path) {
+    const os::Descriptor folder(::open(path.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+    if (folder.number() < 0) fail("cannot open the folder " + path);
+    if (::fsync(folder.number()) != 0) fail("cannot bring the folder " + path + " to the medium");
+}
+
+FlashFile::~FlashFile() {
+    ::close(m_descriptor);
+}
+
+}  // namespace ma

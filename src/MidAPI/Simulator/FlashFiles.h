@@ -1,0 +1,58 @@
+#pragma once
+
+#include <cstdint>
+#include <span>
+#include <stdexcept>
+#include <string>
+
+#include "Utils/Export.h"
+
+namespace ma {
+
+/// A file operation of the simulator failed; the text says which and why.
+class QUENX_EXPORT FlashError : public std::runtime_error {
+  public:
+    explicit FlashError(const std::string& text);
+    ~FlashError() override;
+};
+
+/// Every change that the simulator makes to files, one system call each: the seam at which a test cuts the
+/// power. All operations throw FlashError. No state; may be used from any thread.
+class QUENX_EXPORT FlashFiles {
+  public:
+    FlashFiles() = default;
+    FlashFiles(const FlashFiles&) = delete;
+    FlashFiles& operator=(const FlashFiles&) = delete;
+    virtual ~FlashFiles();
+
+    /// Makes one folder; it may be there already.
+    virtual void makeFolder(const std::string& path);
+    /// Opens an empty file for writing, emptying one that is there; the caller closes the descriptor.
+    virtual int create(const std::string& path);
+    /// Writes all bytes at the end of what was written so far.
+    virtual void write(int descriptor, std::span<const uint8_t> bytes);
+    /// Returns when what was written is on the medium.
+    virtual void sync(int descriptor);
+    virtual void rename(const std::string& from, const std::string& to);
+    /// Returns when the entries of a folder (files made or renamed in it) are on the medium.
+    virtual void syncFolder(const std::string& path);
+};
+
+/// An open file of FlashFiles, closed with the scope.
+class FlashFile {
+  public:
+    FlashFile(FlashFiles& files, const std::string& path)
+        : m_files(files), m_descriptor(files.create(path)) {}
+    FlashFile(const FlashFile&) = delete;
+    FlashFile& operator=(const FlashFile&) = delete;
+    ~FlashFile();
+
+    void write(std::span<const uint8_t> bytes) { m_files.write(m_descriptor, bytes); }
+    void sync() { m_files.sync(m_descriptor); }
+
+  private:
+    FlashFiles& m_files;
+    int m_descriptor;
+};
+
+}  // namespace ma

@@ -1,0 +1,63 @@
+#pragma once
+
+#include <cstdint>
+#include <memory>
+#include <span>
+#include <string>
+#include <vector>
+
+#include "MidAPI/AdapterTypes.h"
+#include "MidAPI/OptionRom.h"
+#include "MidAPI/Simulator/AdapterDescription.h"
+#include "MidAPI/Simulator/Fault.h"
+#include "MidAPI/Simulator/FlashStore.h"
+#include "MidAPI/Simulator/Progress.h"
+#include "Utils/Os/Linux/Mutex.h"
+#include "Utils/ThreadAnnotations.h"
+
+namespace ma {
+
+/// One simulated adapter port: the operations of ma.h for it. Thread-safe.
+class SimulatedAdapter {
+  public:
+    SimulatedAdapter(AdapterDescription description, const std::string& stateDirectory,
+                     std::shared_ptr<FlashFiles> files);
+
+    const AdapterDescription& description() const { return m_description; }
+    FaultList& faults() { return m_faults; }
+
+    utils::PCIAddr address();
+    bool readComponents(std::vector<utils::FirmwareVersionInfo>& components);
+    int prepare(std::span<const uint8_t> file, std::span<uint8_t> output, uint32_t& imageSize,
+                std::vector<utils::FirmwareType>& types);
+    bool write(std::span<const uint8_t> image, uint32_t& errorCode, std::string& errorText);
+    bool updateCapabilityWord(const std::vector<utils::FirmwareType>& types, uint32_t& errorCode,
+                              std::string& errorText);
+    uint16_t progress() const { return m_progress.percent(); }
+    bool setBootType(BootType type);
+    AdapterInfo info();
+
+    /// What it remembers and what it boots; for tests and tools. Throw FlashError.
+    FlashState state() const { return m_store.state(); }
+    std::vector<uint8_t> flashContent() const { return m_store.content(); }
+
+  private:
+    std::vector<utils::FirmwareVersionInfo> components();
+    void requireWritable(std::span<const uint8_t> image) const;
+    void writeLocked(std::span<const uint8_t> image);
+    PrepareStatus prepareUnguarded(std::span<const uint8_t> file, std::span<uint8_t> output,
+                                   uint32_t& imageSize, std::vector<utils::FirmwareType>& types);
+
+    const AdapterDescription m_description;
+    FlashStore m_store;
+    FaultList m_faults;
+    Progress m_progress;
+
+    // What the flash held when it was last read, so that a query need not read it again.
+    utils::Mutex m_cacheMutex;
+    bool m_cacheFilled QUENX_GUARDED_BY(m_cacheMutex) = false;
+    uint32_t m_cacheGeneration QUENX_GUARDED_BY(m_cacheMutex) = 0;
+    std::vector<utils::FirmwareVersionInfo> m_cachedComponents QUENX_GUARDED_BY(m_cacheMutex);
+};
+
+}  // namespace ma

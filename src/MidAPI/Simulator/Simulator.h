@@ -1,0 +1,58 @@
+#pragma once
+
+#include <memory>
+#include <string>
+#include <vector>
+
+#include "MidAPI/Backend.h"
+#include "MidAPI/Simulator/AdapterDescription.h"
+#include "MidAPI/Simulator/Fault.h"
+#include "MidAPI/Simulator/FlashFiles.h"
+#include "Utils/Export.h"
+
+namespace ma {
+
+class SimulatedAdapter;
+struct FlashState;
+
+/// The backend of simulated adapters. Several processes may work on one state directory.
+class QUENX_EXPORT Simulator : public Backend {
+  public:
+    /// Throw AdapterError when the description, or a flash file that it names, has a mistake in it. The state
+    /// directory need not be there: it is made at the first change.
+    Simulator(const std::string& descriptionFile, const std::string& stateDirectory);
+    Simulator(std::vector<AdapterDescription> adapters, const std::string& stateDirectory,
+              std::shared_ptr<FlashFiles> files = std::make_shared<FlashFiles>());
+    ~Simulator() override;
+
+    /// Orders a fault, beside those of the description. Throws AdapterError for an unknown adapter.
+    void injectFault(const std::string& adapter, Fault fault);
+    /// Cancels all faults of an adapter, also those of the description.
+    void clearFaults(const std::string& adapter);
+    /// The persistent record of an adapter and the content of its flash. Throw AdapterError or FlashError.
+    FlashState flashState(const std::string& adapter) const;
+    std::vector<uint8_t> flashContent(const std::string& adapter) const;
+
+    utils::StringArray enumerateAdapters() override;
+    utils::PCIAddr getPCIAddress(const std::string& adapter) override;
+    bool getCanBeUpdated(const std::string& adapter) override;
+    bool getAdapterFirmwareVersion(const std::string& adapter,
+                                   std::vector<utils::FirmwareVersionInfo>& components) override;
+    int prepareFlashImage(const std::string& adapter, const uint8_t* file, uint32_t fileSize, uint8_t* output,
+                          uint32_t* imageSize, std::vector<utils::FirmwareType>& types) override;
+    bool writeFlashImage(const std::string& adapter, const uint8_t* image, uint32_t imageSize,
+                         uint32_t& errorCode, std::string& errorText) override;
+    bool updateCapabilityWord(const std::string& adapter, const std::vector<utils::FirmwareType>& types,
+                              uint32_t& errorCode, std::string& errorText) override;
+    uint16_t getFlashImageUpdateProgress(const std::string& adapter) override;
+    bool setBootType(const std::string& adapter, BootType type) override;
+    AdapterInfo getAdapterInfo(const std::string& adapter) override;
+
+  private:
+    SimulatedAdapter* find(const std::string& name) const;
+    SimulatedAdapter& require(const std::string& name) const;
+
+    std::vector<std::unique_ptr<SimulatedAdapter>> m_adapters;  // not changed after construction
+};
+
+}  // namespace ma

@@ -1,0 +1,52 @@
+#pragma once
+
+#include <cstdint>
+#include <optional>
+#include <span>
+#include <string>
+#include <string_view>
+#include <utility>
+#include <vector>
+
+#include "MidAPI/Toml.h"
+
+namespace ma {
+
+/// Reads the keys of one TOML table, and says of what it cannot take which key it is, in which line, and what
+/// would be right. Every operation throws AdapterError. `subject` names the table in these texts ("adapter
+/// \"eth0\"").
+class TomlTable {
+  public:
+    TomlTable(const toml::table& table, std::string fileName, std::string subject)
+        : m_table(table), m_fileName(std::move(fileName)), m_subject(std::move(subject)) {}
+
+    std::optional<std::string> text(std::string_view key) const;
+    std::string requiredText(std::string_view key, std::string_view example) const;
+    std::optional<uint64_t> number(std::string_view key, uint64_t highest) const;
+    bool flag(std::string_view key, bool otherwise) const;
+    /// The tables of an array of tables; none when the key is not there.
+    std::vector<const toml::table*> tables(std::string_view key) const;
+    /// One of the names, as its index.
+    std::optional<std::size_t> choice(std::string_view key, std::span<const std::string_view> names) const;
+
+    void allowOnly(std::span<const std::string_view> keys) const;
+    [[noreturn]] void fail(std::string_view key, const std::string& what) const;
+    TomlTable inner(const toml::table& table, std::string subject) const {
+        return {table, m_fileName, std::move(subject)};
+    }
+
+  private:
+    [[noreturn]] void failAt(const toml::source_region& where, const std::string& what) const;
+
+    const toml::table& m_table;
+    std::string m_fileName;
+    std::string m_subject;
+};
+
+/// A text from a file as it may be shown: no control characters, cut at a readable length.
+std::string inQuotes(std::string_view text);
+
+/// "a, b or c"
+std::string listOf(std::span<const std::string_view> names);
+
+}  // namespace ma

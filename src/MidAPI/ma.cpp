@@ -1,0 +1,116 @@
+#include "MidAPI/ma.h"
+
+#include <unistd.h>
+
+#include <cstdlib>
+#include <mutex>
+
+#include "MidAPI/Backend.h"
+#include "MidAPI/Simulator/Simulator.h"
+
+namespace ma {
+namespace {
+
+constexpr const char* DESCRIPTION_VARIABLE = "QUENX_ADAPTERS";
+constexpr const char* STATE_VARIABLE = "QUENX_ADAPTER_STATE";
+constexpr const char* DEFAULT_DESCRIPTION = "/etc/quenx-adapters.toml";
+constexpr const char* DEFAULT_STATE = "/var/lib/quenx/adapters";
+
+std::string environmentOr(const char* variable, const char* otherwise) {
+    const char* value = std::getenv(variable);
+    return value != nullptr && *value != '\0' ? value : otherwise;
+}
+
+std::shared_ptr<Backend> makeDefaultBackend() {
+    const std::string description = environmentOr(DESCRIPTION_VARIABLE, "");
+    const std::string state = environmentOr(STATE_VARIABLE, DEFAULT_STATE);
+    if (!description.empty()) return std::make_shared<Simulator>(description, state);
+    if (::access(DEFAULT_DESCRIPTION, F_OK) == 0)
+        return std::make_shared<Simulator>(DEFAULT_DESCRIPTION, state);
+    return std::make_shared<Simulator>(std::vector<AdapterDescription>{}, state);
+}
+
+/// The backend in use. A failure to make one is not remembered: the next call reads the mended description.
+class Selection {
+  public:
+    std::shared_ptr<Backend> current() {
+        const std::lock_guard lock(m_mutex);
+        if (!m_backend) m_backend = makeDefaultBackend();
+        return m_backend;
+    }
+
+    std::shared_ptr<Backend> exchange(std::shared_ptr<Backend> backend) {
+        const std::lock_guard lock(m_mutex);
+        m_backend.swap(backend);
+        return backend;
+    }
+
+  private:
+    std::mutex m_mutex;
+    std::shared_ptr<Backend> m_backend;
+};
+
+/// Of static storage from the load of this library on, so that it outlives the providers: at the exit of a
+/// process that does not unload them, their workers still flash.
+constinit Selection selection;
+
+std::shared_ptr<Backend> backend() {
+    return selection.current();
+}
+
+}  // namespace
+
+Backend::~Backend() = default;
+
+utils::StringArray enumerateAdapters() {
+    return backend()->enumerateAdapters();
+}
+
+utils::PCIAddr getPCIAddress(std::string adapter) {
+    return backend()->getPCIAddress(adapter);
+}
+
+bool getCanBeUpdated(std::string adapter) {
+    return backend()->getCanBeUpdated(adapter);
+}
+
+bool getAdapterFirmwareVersion(std::string adapter, std::vector<utils::FirmwareVersionInfo>& components) {
+    return backend()->getAdapterFirmwareVersion(adapter, components);
+}
+
+int prepareFlashImage(std::string adapter, const uint8_t* file, uint32_t fileSize, uint8_t* output,
+                      uint32_t* imageSize, std::vector<utils::FirmwareType>& types) {
+    return backend()->prepareFlashImage(adapter, file, fileSize, output, imageSize, types);
+}
+
+bool writeFlashImage(std::string adapter, const uint8_t* image, uint32_t imageSize, uint32_t& errorCode,
+                     std::string& errorText) {
+    return backend()->writeFlashImage(adapter, image, imageSize, errorCode, errorText);
+}
+
+bool updateCapabilityWord(std::string adapter, std::vector<utils::FirmwareType> types, uint32_t& errorCode,
+                          std::string& errorText) {
+    return backend()->updateCapabilityWord(adapter, types, errorCode, errorText);
+}
+
+uint16_t getFlashImageUpdateProgress(std::string adapter) {
+    return backend()->getFlashImageUpdateProgress(adapter);
+}
+
+bool setBootType(std::string adapter, BootType type) {
+    return backend()->setBootType(adapter, type);
+}
+
+AdapterInfo getAdapterInfo(std::string adapter) {
+    return backend()->getAdapterInfo(adapter);
+}
+
+void configureSimulator(const std::string& descriptionFile, const std::string& stateDirectory) {
+    selection.exchange(std::make_shared<Simulator>(descriptionFile, stateDirectory));
+}
+
+std::shared_ptr<Backend> setBackend(std::shared_ptr<Backend> backend) {
+    return selection.exchange(std::move(backend));
+}
+
+}  // namespace ma

@@ -1,0 +1,88 @@
+#pragma once
+
+#include <cstdint>
+#include <memory>
+#include <string>
+#include <vector>
+
+#include "MidAPI/AdapterTypes.h"
+#include "Utils/Export.h"
+#include "Utils/FirmwareTypes.h"
+#include "Utils/StringArray.h"
+
+/// The adapter API. An adapter name addresses one port (one PCI function) of an Ethernet adapter, as
+/// enumerateAdapters() returns it. Every operation may be called from any thread at any time, also for a port
+/// that another thread is writing to. Where an operation has no result to report a failure with, it throws
+/// AdapterError; all of them throw it when the adapters cannot be had at all (an adapter description with a
+/// mistake in it).
+namespace ma {
+
+class Backend;
+
+/// Names of all adapter ports, in the backend's order; empty when there are none.
+QUENX_EXPORT utils::StringArray enumerateAdapters();
+
+/// PCI location of a port; its string is the full address text, domain included. Functions of one card have
+/// equal bus and device. Throws AdapterError for an unknown name.
+QUENX_EXPORT utils::PCIAddr getPCIAddress(std::string adapter);
+
+/// True when the port's firmware can be updated; false for an unknown name.
+QUENX_EXPORT bool getCanBeUpdated(std::string adapter);
+
+/// Fills `components` with the firmware components on the port, in ascending order of type; the version is
+/// the code revision of the image (0 to 65535). Returns false, and fills nothing, for an unknown name. Throws
+/// AdapterError when the adapter cannot be read.
+QUENX_EXPORT bool getAdapterFirmwareVersion(std::string adapter,
+                                            std::vector<utils::FirmwareVersionInfo>& components);
+
+/// Verifies an image file against a port and makes of it the image to write.
+/// @param file,fileSize  the file's bytes; only read
+/// @param output         the caller's buffer of `fileSize` bytes; may not overlap `file`
+/// @param imageSize      the size of `output` on entry; the length of the image in it on return
+/// @param types          in: the types to install, in any order, type 0 ignored, none for all that the file
+/// has;
+///                       out: the types of the prepared image, ascending. Unchanged where the output is not
+///                       filled.
+/// @return a PrepareStatus. Output, size and types are filled for PREPARED, IMAGE_IS_OLDER and
+/// IMAGE_TYPES_DIFFER,
+///         since a caller may insist on the latter two. The reason of any other status than 0 is logged.
+/// Sets the port's progress to 0, unless it is being written to.
+QUENX_EXPORT int prepareFlashImage(std::string adapter, const uint8_t* file, uint32_t fileSize,
+                                   uint8_t* output, uint32_t* imageSize,
+                                   std::vector<utils::FirmwareType>& types);
+
+/// Writes a prepared image to a port: images of the types in it replace those on the port, the others stay.
+/// Blocks until done. Returns true and leaves 0 and an empty text on success, false with a WriteError (or the
+/// device's own code) and its text otherwise; the old firmware is then whole.
+QUENX_EXPORT bool writeFlashImage(std::string adapter, const uint8_t* image, uint32_t imageSize,
+                                  uint32_t& errorCode, std::string& errorText);
+
+/// Enables the boot images of these types in the port's capability word (bit n stands for type n) and
+/// disables those that the flash no longer holds. Results as writeFlashImage().
+QUENX_EXPORT bool updateCapabilityWord(std::string adapter, std::vector<utils::FirmwareType> types,
+                                       uint32_t& errorCode, std::string& errorText);
+
+/// Percentage, 0 to 100, of the update of this port: 0 from a prepare to its write, 100 once the new image is
+/// the one that the port boots. Never goes back during a write, and stays until the next prepare. 0 for an
+/// unknown name.
+QUENX_EXPORT uint16_t getFlashImageUpdateProgress(std::string adapter);
+
+/// Sets the boot protocol of a port. Returns false when that failed.
+QUENX_EXPORT bool setBootType(std::string adapter, BootType type);
+
+/// Everything else that is known of a port. Throws AdapterError for an unknown name or an unreadable adapter.
+QUENX_EXPORT AdapterInfo getAdapterInfo(std::string adapter);
+
+/// Selects simulated adapters: for embedders and tools that have their own idea of where the files are.
+/// Throws AdapterError, naming file, line and what would be right, when the description has a mistake; the
+/// backend in use then stays. Without this call the first operation reads the file named by the environment
+/// variable QUENX_ADAPTERS, or else /etc/quenx-adapters.toml; the state directory is QUENX_ADAPTER_STATE, or
+/// else /var/lib/quenx/adapters. Where there is neither a variable nor that file, there are no adapters.
+QUENX_EXPORT void configureSimulator(const std::string& descriptionFile, const std::string& stateDirectory);
+
+/// Replaces the backend (for tests, and for embedders that bring their own); null goes back to the one that
+/// the environment names. Operations that have begun end on the backend on which they began. Returns the
+/// previous one, null when none was chosen yet.
+QUENX_EXPORT std::shared_ptr<Backend> setBackend(std::shared_ptr<Backend> backend);
+
+}  // namespace ma

@@ -1,0 +1,60 @@
+#pragma once
+
+#include <string>
+
+#include "Utils/Export.h"
+#include "Utils/FirmwareTypes.h"
+#include "Utils/StringArray.h"
+
+/// What the inventory's instances can do for other providers. A provider finds an instance through the broker
+/// and asks it by dynamic_cast from core::CimInstance; no provider library links another. All operations may
+/// be called from any thread, while the instance is held.
+namespace inventory {
+
+/// One port of an Ethernet adapter.
+class QUENX_EXPORT EthernetPort {
+  public:
+    virtual ~EthernetPort();
+    /// The name by which the adapter API knows the port; never empty.
+    virtual std::string getAdapterName() const = 0;
+    virtual utils::PCIAddr getPCIAddress() const = 0;
+};
+
+/// The card that carries a number of ports.
+class QUENX_EXPORT PortController {
+  public:
+    virtual ~PortController();
+    /// Bus and device of the card; it carries no function.
+    virtual utils::PCIAddr getPCIAddress() const = 0;
+    /// True when the address is that of one of the card's functions.
+    virtual bool holds(const utils::PCIAddr& address) const = 0;
+};
+
+/// A piece of firmware: in a file that can be installed, or on an adapter.
+class QUENX_EXPORT SoftwareIdentity {
+  public:
+    /// What getTypeCode() tells apart.
+    enum TypeCode : int {
+        INSTALLED_COMPONENT = 1,  ///< runs on an adapter
+        FIRMWARE_IMAGE = 4,       ///< a file that can be installed
+    };
+
+    virtual ~SoftwareIdentity();
+    /// Equal to SoftwareIdentityResource::getFirmwareFileID() of the resource that has the file.
+    virtual std::string getIdentifier() const = 0;
+    virtual int getTypeCode() const = 0;
+    /// Names of the image types in it, such as "IMG_PXE"; empty when there are none that can be installed.
+    virtual utils::StringArray getTargetTypes() const = 0;
+};
+
+/// Where the file of a software identity is.
+class QUENX_EXPORT SoftwareIdentityResource {
+  public:
+    virtual ~SoftwareIdentityResource();
+    /// The identifier of the firmware file that the resource stands for.
+    virtual std::string getFirmwareFileID() const = 0;
+    /// The file's URI.
+    virtual std::string getAccessInfo() const = 0;
+};
+
+}  // namespace inventory

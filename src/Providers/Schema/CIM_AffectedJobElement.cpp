@@ -1,0 +1,12 @@
+#include "Providers/Schema/CIM_AffectedJobElement.h"
+
+constinit const core::CimClassInfo CIM_AffectedJobElement::classInfo{
+    "CIM_AffectedJobElement", nullptr, true, {}, &core::makeSample<CIM_AffectedJobElement>};
+
+CIM_AffectedJobElement::CIM_AffectedJobElement() {
+    AffectedElement.setKey();
+    AffectingElement.setKey();
+    declareClass(classInfo);
+}
+
+CIM_AffectedJobElement::~CIM_AffectedJobElement() = default;

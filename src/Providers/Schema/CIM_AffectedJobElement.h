@@ -1,0 +1,20 @@
+#pragma once
+
+#include "Framework/CimInstance.h"
+#include "Framework/CimProperties.h"
+#include "Providers/Schema/CimPropertyRefT.h"
+#include "Utils/Export.h"
+
+/// DMTF CIM_AffectedJobElement: a job changes an element while it runs.
+class QUENX_EXPORT CIM_AffectedJobElement : public core::CimInstance {
+  public:
+    static const core::CimClassInfo classInfo;
+
+    CIM_AffectedJobElement();
+    ~CIM_AffectedJobElement() override;
+
+    core::CimPropertyRefT<CIM_ManagedElement> AffectedElement{"AffectedElement", this};
+    core::CimPropertyRefT<CIM_Job> AffectingElement{"AffectingElement", this};
+    core::CimPropertyUint16_arr ElementEffects{"ElementEffects", this};
+    core::CimPropertyString_arr OtherElementEffectsDescriptions{"OtherElementEffectsDescriptions", this};
+};

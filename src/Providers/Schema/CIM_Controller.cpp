@@ -1,0 +1,14 @@
+#include "Providers/Schema/CIM_Controller.h"
+
+constinit const core::CimClassInfo CIM_Controller::classInfo{
+    "CIM_Controller", &CIM_LogicalDevice::classInfo, false, {}, &core::makeSample<CIM_Controller>};
+
+CIM_Controller::CIM_Controller() {
+    SystemCreationClassName.setKey();
+    SystemName.setKey();
+    CreationClassName.setKey();
+    DeviceID.setKey();
+    declareClass(classInfo);
+}
+
+CIM_Controller::~CIM_Controller() = default;

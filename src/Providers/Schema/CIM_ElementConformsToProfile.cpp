@@ -1,0 +1,12 @@
+#include "Providers/Schema/CIM_ElementConformsToProfile.h"
+
+constinit const core::CimClassInfo CIM_ElementConformsToProfile::classInfo{
+    "CIM_ElementConformsToProfile", nullptr, true, {}, &core::makeSample<CIM_ElementConformsToProfile>};
+
+CIM_ElementConformsToProfile::CIM_ElementConformsToProfile() {
+    ConformantStandard.setKey();
+    ManagedElement.setKey();
+    declareClass(classInfo);
+}
+
+CIM_ElementConformsToProfile::~CIM_ElementConformsToProfile() = default;

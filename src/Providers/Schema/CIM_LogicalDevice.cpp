@@ -1,0 +1,17 @@
+#include "Providers/Schema/CIM_LogicalDevice.h"
+
+constinit const core::CimClassInfo CIM_LogicalDevice::classInfo{"CIM_LogicalDevice",
+                                                                &CIM_EnabledLogicalElement::classInfo,
+                                                                false,
+                                                                {},
+                                                                &core::makeSample<CIM_LogicalDevice>};
+
+CIM_LogicalDevice::CIM_LogicalDevice() {
+    SystemCreationClassName.setKey();
+    SystemName.setKey();
+    CreationClassName.setKey();
+    DeviceID.setKey();
+    declareClass(classInfo);
+}
+
+CIM_LogicalDevice::~CIM_LogicalDevice() = default;

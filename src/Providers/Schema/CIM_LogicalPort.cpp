@@ -1,0 +1,14 @@
+#include "Providers/Schema/CIM_LogicalPort.h"
+
+constinit const core::CimClassInfo CIM_LogicalPort::classInfo{
+    "CIM_LogicalPort", &CIM_LogicalDevice::classInfo, false, {}, &core::makeSample<CIM_LogicalPort>};
+
+CIM_LogicalPort::CIM_LogicalPort() {
+    SystemCreationClassName.setKey();
+    SystemName.setKey();
+    CreationClassName.setKey();
+    DeviceID.setKey();
+    declareClass(classInfo);
+}
+
+CIM_LogicalPort::~CIM_LogicalPort() = default;

@@ -1,0 +1,12 @@
+#include "Providers/Schema/CIM_OwningJobElement.h"
+
+constinit const core::CimClassInfo CIM_OwningJobElement::classInfo{
+    "CIM_OwningJobElement", nullptr, true, {}, &core::makeSample<CIM_OwningJobElement>};
+
+CIM_OwningJobElement::CIM_OwningJobElement() {
+    OwningElement.setKey();
+    OwnedElement.setKey();
+    declareClass(classInfo);
+}
+
+CIM_OwningJobElement::~CIM_OwningJobElement() = default;

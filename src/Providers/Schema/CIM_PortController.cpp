@@ -1,0 +1,14 @@
+#include "Providers/Schema/CIM_PortController.h"
+
+constinit const core::CimClassInfo CIM_PortController::classInfo{
+    "CIM_PortController", &CIM_Controller::classInfo, false, {}, &core::makeSample<CIM_PortController>};
+
+CIM_PortController::CIM_PortController() {
+    SystemCreationClassName.setKey();
+    SystemName.setKey();
+    CreationClassName.setKey();
+    DeviceID.setKey();
+    declareClass(classInfo);
+}
+
+CIM_PortController::~CIM_PortController() = default;

@@ -1,0 +1,30 @@
+#pragma once
+
+#include "Framework/CimProperties.h"
+#include "Providers/Schema/CIM_ManagedElement.h"
+#include "Utils/Export.h"
+
+/// DMTF CIM_RegisteredSpecification: a document of a standards body, or another, that elements conform to.
+class QUENX_EXPORT CIM_RegisteredSpecification : public CIM_ManagedElement {
+  public:
+    static const core::CimClassInfo classInfo;
+
+    CIM_RegisteredSpecification();
+    ~CIM_RegisteredSpecification() override;
+
+    core::CimPropertyString InstanceID{"InstanceID", this};
+    core::CimPropertyUint16 SpecificationType{"SpecificationType", this};
+    core::CimPropertyString OtherSpecificationType{"OtherSpecificationType", this};
+    core::CimPropertyUint16 RegisteredOrganization{"RegisteredOrganization", this};
+    core::CimPropertyString OtherRegisteredOrganization{"OtherRegisteredOrganization", this};
+    core::CimPropertyString RegisteredName{"RegisteredName", this};
+    core::CimPropertyString RegisteredVersion{"RegisteredVersion", this};
+    core::CimPropertyUint16_arr AdvertiseTypes{"AdvertiseTypes", this};
+    core::CimPropertyString_arr AdvertiseTypeDescriptions{"AdvertiseTypeDescriptions", this};
+
+    // Repeated from the superclasses: the ones here are served.
+    core::CimPropertyString Caption{"Caption", this};
+    core::CimPropertyString Description{"Description", this};
+    core::CimPropertyString ElementName{"ElementName", this};
+    core::CimPropertyUint64 Generation{"Generation", this};
+};

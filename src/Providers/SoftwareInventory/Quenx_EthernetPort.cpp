@@ -1,0 +1,86 @@
+#include "Providers/SoftwareInventory/Quenx_EthernetPort.h"
+
+#include "MidAPI/ma.h"
+#include "Providers/SoftwareInventory/Device.h"
+#include "Utils/Debug.h"
+#include "Utils/Log.h"
+#include "Utils/Utils.h"
+
+namespace {
+
+/// Twelve hexadecimal digits, as CIM_NetworkPort wants an address.
+std::string addressText(const std::array<std::uint8_t, 6>& mac) {
+    return fmt("%02X%02X%02X%02X%02X%02X", mac[0], mac[1], mac[2], mac[3], mac[4], mac[5]);
+}
+
+}  // namespace
+
+constinit const core::CimClassInfo Quenx_EthernetPort::classInfo{
+    "Quenx_EthernetPort", &CIM_EthernetPort::classInfo, false, {}, nullptr};
+
+Quenx_EthernetPort::Quenx_EthernetPort(inventory::Port port) : m_port(std::move(port)) {
+    declareClass(classInfo);
+    inventory::setDeviceKeys(*this, getUniqId());
+    PortType = 0;        // unknown: not told by the adapter API
+    LinkTechnology = 2;  // Ethernet
+}
+
+Quenx_EthernetPort::~Quenx_EthernetPort() = default;
+
+std::string Quenx_EthernetPort::getClassName() const {
+    return classInfo.name;
+}
+
+std::string Quenx_EthernetPort::getUniqId() const {
+    return m_port.adapter;
+}
+
+void Quenx_EthernetPort::refresh() {
+    // All questions come before the lock, since the adapter may take its time.
+    const std::optional<ma::AdapterInfo> info = inventory::readInfo(m_port.adapter);
+    const bool updatable = ma::getCanBeUpdated(m_port.adapter);
+
+    const core::RecursiveLocker lock(getMutex());
+    inventory::setIdentification(*this,
+                                 inventory::identify(utils::formatPCIAddr(m_port.address), info, updatable));
+    setLink(info);
+}
+
+void Quenx_EthernetPort::setLink(const std::optional<ma::AdapterInfo>& info) {
+    using inventory::EnabledState;
+    if (!info) {
+        inventory::setDeviceState(*this, EnabledState::Unknown);
+        Description.setNull();
+        Speed.setNull();
+        PermanentAddress.setNull();
+        NetworkAddresses.setNull();
+        return;
+    }
+    inventory::setDeviceState(*this, info->linkUp ? EnabledState::Enabled : EnabledState::EnabledButOffline);
+    Description = info->description;
+    PermanentAddress = addressText(info->permanentMac);
+    NetworkAddresses = std::vector<std::string>{addressText(info->permanentMac)};
+    if (info->speed != 0) {
+        Speed = info->speed;
+    } else {
+        Speed.setNull();
+    }
+}
+
+std::string Quenx_EthernetPort::getAdapterName() const {
+    return m_port.adapter;
+}
+
+utils::PCIAddr Quenx_EthernetPort::getPCIAddress() const {
+    return m_port.address;
+}
+
+std::string Quenx_EthernetPortClass::getClassName() {
+    return Quenx_EthernetPort::classInfo.name;
+}
+
+utils::SafeList<core::CimInstance*>::Iterator Quenx_EthernetPortClass::getInstances() {
+    QUENX_DEBUG("getInstances");
+    const utils::TimeStamp time("Quenx_EthernetPortClass::getInstances");
+    return m_ports.getElements(inventory::readPorts());
+}

@@ -1,0 +1,42 @@
+#pragma once
+
+#include "Framework/CimClass.h"
+#include "Providers/InventoryInterfaces.h"
+#include "Providers/Schema/CIM_EthernetPort.h"
+#include "Providers/SoftwareInventory/AdapterReading.h"
+#include "Providers/SoftwareInventory/KeptInstances.h"
+
+/// One port (one PCI function) of an Ethernet adapter.
+class Quenx_EthernetPort : public CIM_EthernetPort, public inventory::EthernetPort {
+  public:
+    static const core::CimClassInfo classInfo;
+
+    explicit Quenx_EthernetPort(inventory::Port port);
+    std::string getClassName() const override;
+    ~Quenx_EthernetPort() override;
+
+    /// The adapter name.
+    virtual std::string getUniqId() const;
+    /// Asks the adapter, then sets every value that can change.
+    virtual void refresh();
+
+    std::string getAdapterName() const override;
+    utils::PCIAddr getPCIAddress() const override;
+
+  private:
+    void setLink(const std::optional<ma::AdapterInfo>& info);
+
+    const inventory::Port m_port;
+};
+
+/// Serves a port for each adapter name.
+class Quenx_EthernetPortClass : public core::CimClass {
+  public:
+    using Instance = Quenx_EthernetPort;
+
+    std::string getClassName() override;
+    utils::SafeList<core::CimInstance*>::Iterator getInstances() override;
+
+  private:
+    KeptInstances<Quenx_EthernetPort, inventory::Port> m_ports;
+};

@@ -1,0 +1,86 @@
+#include "Providers/SoftwareInventory/Quenx_PortController.h"
+
+#include <algorithm>
+#include <map>
+
+#include "MidAPI/ma.h"
+#include "Providers/SoftwareInventory/Device.h"
+#include "Utils/Debug.h"
+#include "Utils/Log.h"
+#include "Utils/Utils.h"
+
+namespace inventory {
+
+std::vector<Card> groupByCard(const std::vector<Port>& ports) {
+    std::vector<Card> cards;
+    std::map<std::pair<std::uint8_t, std::uint8_t>, std::size_t> known;
+    for (const Port& port : ports) {
+        const auto [place, isNew] = known.try_emplace({port.address.bus, port.address.device}, cards.size());
+        if (isNew) cards.emplace_back();
+        cards[place->second].ports.push_back(port);
+    }
+    return cards;
+}
+
+}  // namespace inventory
+
+constinit const core::CimClassInfo Quenx_PortController::classInfo{
+    "Quenx_PortController", &CIM_PortController::classInfo, false, {}, nullptr};
+
+Quenx_PortController::Quenx_PortController(inventory::Card card) : m_card(std::move(card)) {
+    declareClass(classInfo);
+    inventory::setDeviceKeys(*this, getUniqId());
+    ControllerType = 2;  // Ethernet
+}
+
+Quenx_PortController::~Quenx_PortController() = default;
+
+std::string Quenx_PortController::getClassName() const {
+    return classInfo.name;
+}
+
+std::string Quenx_PortController::getUniqId() const {
+    return utils::formatPCIAddr(getPCIAddress());
+}
+
+void Quenx_PortController::refresh() {
+    // All questions come before the lock, since an adapter may take its time.
+    std::optional<ma::AdapterInfo> info;
+    bool updatable = false;
+    for (const inventory::Port& port : m_card.ports) {
+        if (!info) info = inventory::readInfo(port.adapter);
+        updatable = updatable || ma::getCanBeUpdated(port.adapter);
+    }
+
+    const core::RecursiveLocker lock(getMutex());
+    inventory::setIdentification(*this, inventory::identify(getUniqId(), info, updatable));
+    if (info) {
+        inventory::setDeviceState(*this, inventory::EnabledState::Enabled);
+        Description = info->description;
+    } else {
+        inventory::setDeviceState(*this, inventory::EnabledState::Unknown);
+        Description.setNull();
+    }
+}
+
+utils::PCIAddr Quenx_PortController::getPCIAddress() const {
+    utils::PCIAddr address = m_card.ports.front().address;
+    address.function = 0;
+    address.noFunction = true;
+    address.text.clear();
+    return address;
+}
+
+bool Quenx_PortController::holds(const utils::PCIAddr& address) const {
+    return address.sameAdapter(m_card.ports.front().address);
+}
+
+std::string Quenx_PortControllerClass::getClassName() {
+    return Quenx_PortController::classInfo.name;
+}
+
+utils::SafeList<core::CimInstance*>::Iterator Quenx_PortControllerClass::getInstances() {
+    QUENX_DEBUG("getInstances");
+    const utils::TimeStamp time("Quenx_PortControllerClass::getInstances");
+    return m_controllers.getElements(inventory::groupByCard(inventory::readPorts()));
+}

@@ -1,0 +1,54 @@
+#pragma once
+
+#include "Framework/CimClass.h"
+#include "Providers/InventoryInterfaces.h"
+#include "Providers/Schema/CIM_PortController.h"
+#include "Providers/SoftwareInventory/AdapterReading.h"
+#include "Providers/SoftwareInventory/KeptInstances.h"
+
+namespace inventory {
+
+/// A card: the ports that share a PCI bus and device. Never without a port.
+struct Card {
+    std::vector<Port> ports;
+
+    bool operator==(const Card&) const = default;
+};
+
+/// The ports by card, in the order of each card's first port.
+std::vector<Card> groupByCard(const std::vector<Port>& ports);
+
+}  // namespace inventory
+
+/// One card with the ports that are its PCI functions.
+class Quenx_PortController : public CIM_PortController, public inventory::PortController {
+  public:
+    static const core::CimClassInfo classInfo;
+
+    explicit Quenx_PortController(inventory::Card card);
+    std::string getClassName() const override;
+    ~Quenx_PortController() override;
+
+    /// Bus and device, as "3b:00".
+    virtual std::string getUniqId() const;
+    /// Asks the card's ports, then sets every value that can change.
+    virtual void refresh();
+
+    utils::PCIAddr getPCIAddress() const override;
+    bool holds(const utils::PCIAddr& address) const override;
+
+  private:
+    const inventory::Card m_card;
+};
+
+/// Serves a controller for each card.
+class Quenx_PortControllerClass : public core::CimClass {
+  public:
+    using Instance = Quenx_PortController;
+
+    std::string getClassName() override;
+    utils::SafeList<core::CimInstance*>::Iterator getInstances() override;
+
+  private:
+    KeptInstances<Quenx_PortController, inventory::Card> m_controllers;
+};

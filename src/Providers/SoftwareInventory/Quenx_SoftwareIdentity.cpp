@@ -1,0 +1,127 @@
+#include "Providers/SoftwareInventory/Quenx_SoftwareIdentity.h"
+
+#include <algorithm>
+#include <set>
+
+#include "Utils/Debug.h"
+#include "Utils/Log.h"
+
+namespace {
+
+/// Values of CIM_SoftwareIdentity.Classifications.
+enum Classification : unsigned short { DRIVER = 2, FIRMWARE = 10, BIOS = 11 };
+
+std::vector<unsigned short> classify(const std::vector<inventory::FirmwareComponent>& components) {
+    const auto isDriver = [](const inventory::FirmwareComponent& part) { return part.type == "IMG_UEFI"; };
+    std::vector<unsigned short> result{FIRMWARE};
+    if (std::any_of(components.begin(), components.end(), isDriver)) result.push_back(DRIVER);
+    if (!std::all_of(components.begin(), components.end(), isDriver)) result.push_back(BIOS);
+    return result;
+}
+
+/// Sets a text, or null where there is none.
+void setText(core::CimPropertyString& property, const std::string& text) {
+    if (text.empty()) {
+        property.setNull();
+    } else {
+        property = text;
+    }
+}
+
+}  // namespace
+
+constinit const core::CimClassInfo Quenx_SoftwareIdentity::classInfo{
+    "Quenx_SoftwareIdentity", &CIM_SoftwareIdentity::classInfo, false, {}, nullptr};
+
+Quenx_SoftwareIdentity::Quenx_SoftwareIdentity(inventory::Firmware firmware)
+    : m_firmware(std::move(firmware)) {
+    declareClass(classInfo);
+    InstanceID = "Quenx:" + getUniqId();
+}
+
+Quenx_SoftwareIdentity::~Quenx_SoftwareIdentity() = default;
+
+std::string Quenx_SoftwareIdentity::getClassName() const {
+    return classInfo.name;
+}
+
+std::string Quenx_SoftwareIdentity::getUniqId() const {
+    return m_firmware.identifier;
+}
+
+void Quenx_SoftwareIdentity::refresh() {
+    const core::RecursiveLocker lock(getMutex());
+    setKind();
+    setVersions();
+    setText(Manufacturer, m_firmware.manufacturer);
+    setText(Name, m_firmware.product);
+    TargetTypes = getTargetTypes();
+    Classifications = classify(m_firmware.components);
+}
+
+void Quenx_SoftwareIdentity::setKind() {
+    const bool isInstalled = m_firmware.typeCode == INSTALLED_COMPONENT;
+    IsEntity = isInstalled;
+    Description = isInstalled ? "Firmware of adapter " + m_firmware.adapter
+                              : "Firmware image for PCI device " + m_firmware.ids;
+    OperationalStatus = std::vector<unsigned short>{2};  // OK
+}
+
+void Quenx_SoftwareIdentity::setVersions() {
+    std::uint32_t highest = 0;
+    std::string text;
+    std::vector<std::string> values{m_firmware.ids};
+    std::vector<std::string> types{"Quenx:PCI Vendor and Device ID"};
+    for (const inventory::FirmwareComponent& part : m_firmware.components) {
+        const std::string version = std::to_string(part.version);
+        highest = std::max(highest, part.version);
+        text += (text.empty() ? "" : ", ") + part.type + " " + version;
+        values.push_back(version);
+        types.push_back("Quenx:" + part.type);
+    }
+    setText(VersionString, text);
+    ElementName = text.empty() ? m_firmware.ids : m_firmware.ids + " " + text;
+    IdentityInfoValue = std::move(values);
+    IdentityInfoType = std::move(types);
+    if (m_firmware.components.empty()) {
+        MajorVersion.setNull();
+    } else {
+        MajorVersion = static_cast<unsigned short>(highest);
+    }
+}
+
+std::string Quenx_SoftwareIdentity::getIdentifier() const {
+    return m_firmware.identifier;
+}
+
+int Quenx_SoftwareIdentity::getTypeCode() const {
+    return m_firmware.typeCode;
+}
+
+utils::StringArray Quenx_SoftwareIdentity::getTargetTypes() const {
+    utils::StringArray types;
+    for (const inventory::FirmwareComponent& part : m_firmware.components)
+        types.push_back(part.type);
+    return types;
+}
+
+Quenx_SoftwareIdentityClass::Quenx_SoftwareIdentityClass(std::shared_ptr<inventory::FirmwareCatalog> catalog)
+    : m_catalog(std::move(catalog)) {}
+
+std::string Quenx_SoftwareIdentityClass::getClassName() {
+    return Quenx_SoftwareIdentity::classInfo.name;
+}
+
+utils::SafeList<core::CimInstance*>::Iterator Quenx_SoftwareIdentityClass::getInstances() {
+    QUENX_DEBUG("getInstances");
+    const utils::TimeStamp time("Quenx_SoftwareIdentityClass::getInstances");
+    std::vector<inventory::Firmware> all;
+    std::set<std::string> identifiers;
+    for (const auto& file : m_catalog->scan()) {
+        if (identifiers.insert(file->firmware.identifier).second) all.push_back(file->firmware);
+    }
+    for (inventory::Firmware& installed : inventory::readInstalled(inventory::readPorts())) {
+        all.push_back(std::move(installed));
+    }
+    return m_identities.getElements(all);
+}

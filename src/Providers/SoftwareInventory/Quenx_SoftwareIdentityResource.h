@@ -1,0 +1,42 @@
+#pragma once
+
+#include "Framework/CimClass.h"
+#include "Providers/InventoryInterfaces.h"
+#include "Providers/Schema/CIM_SoftwareIdentityResource.h"
+#include "Providers/SoftwareInventory/FirmwareCatalog.h"
+#include "Providers/SoftwareInventory/KeptInstances.h"
+
+/// A firmware file in one of the configured directories.
+class Quenx_SoftwareIdentityResource : public CIM_SoftwareIdentityResource,
+                                       public inventory::SoftwareIdentityResource {
+  public:
+    static const core::CimClassInfo classInfo;
+
+    explicit Quenx_SoftwareIdentityResource(inventory::FirmwareFile file);
+    std::string getClassName() const override;
+    ~Quenx_SoftwareIdentityResource() override;
+
+    /// The file's path.
+    virtual std::string getUniqId() const;
+    virtual void refresh();
+
+    std::string getFirmwareFileID() const override;
+    std::string getAccessInfo() const override;
+
+  private:
+    const inventory::FirmwareFile m_file;
+};
+
+/// Serves a resource for each file.
+class Quenx_SoftwareIdentityResourceClass : public core::CimClass {
+  public:
+    using Instance = Quenx_SoftwareIdentityResource;
+
+    explicit Quenx_SoftwareIdentityResourceClass(std::shared_ptr<inventory::FirmwareCatalog> catalog);
+    std::string getClassName() override;
+    utils::SafeList<core::CimInstance*>::Iterator getInstances() override;
+
+  private:
+    const std::shared_ptr<inventory::FirmwareCatalog> m_catalog;
+    KeptInstances<Quenx_SoftwareIdentityResource, inventory::FirmwareFile> m_resources;
+};

@@ -1,0 +1,126 @@
+#include "Providers/SoftwareUpdate/JobThread.h"
+
+#include <algorithm>
+
+#include "MidAPI/ma.h"
+#include "Providers/SoftwareUpdate/Quenx_ConcreteJob.h"
+#include "Utils/Exception.h"
+#include "Utils/Log.h"
+#include "Utils/Os/Linux/LinuxOSLocker.h"
+
+namespace {
+
+constexpr unsigned int kStartPause = 10;       // ms
+constexpr unsigned int kTerminationPoll = 50;  // ms
+constexpr int kDestructionTimeout = 3000;      // ms
+constexpr std::uint32_t kTimeoutErrorCode = 4;
+constexpr auto kDefaultBootType = static_cast<ma::BootType>(0);
+
+/// A binary search in the list as it is. Nobody sorts it: in an unsorted list the search may miss, and does
+/// no harm.
+bool holdsType(const std::vector<utils::FirmwareType>& types, utils::FirmwareType wanted) {
+    std::size_t begin = 0;
+    std::size_t end = types.size();
+    while (begin < end) {
+        const std::size_t middle = begin + (end - begin) / 2;
+        if (types[middle] < wanted) {
+            begin = middle + 1;
+        } else {
+            end = middle;
+        }
+    }
+    return begin < types.size() && types[begin] == wanted;
+}
+
+}  // namespace
+
+std::atomic<std::int32_t> JobThread::executionCount{0};
+
+JobThread::JobThread(Quenx_ConcreteJob* job) : m_myJob(job) {
+    QUENX_DEBUG("Creating JobThread %p", static_cast<const void*>(this));
+    QUENX_ASSERT_TEXT(job != nullptr, __FILE__, __LINE__, "__null != myJob");
+}
+
+JobThread::~JobThread() {
+    QUENX_DEBUG("Destroying JobThread %p", static_cast<const void*>(this));
+    if (m_started == true) {
+        QUENX_DEBUG("Destroying JobThread %p, waiting for terminate", static_cast<const void*>(this));
+        if (terminate(kDestructionTimeout)) {
+            QUENX_DEBUG("JobThread %p, terminated", static_cast<const void*>(this));
+        } else {
+            QUENX_ERROR("JobThread %p, terminating timeout error", static_cast<const void*>(this));
+        }
+    }
+    shutdown();
+}
+
+void JobThread::start() {
+    m_started = true;
+    Thread::start();
+}
+
+void JobThread::stopFwUpdateExecution() {
+    if (m_stopRequested == false) m_stopRequested = true;
+}
+
+bool JobThread::terminate(int timeout) {
+    stopFwUpdateExecution();
+    while (m_executed == false && timeout > 0) {
+        msleep(kTerminationPoll);
+        timeout -= static_cast<int>(kTerminationPoll);
+    }
+    return timeout >= 0;
+}
+
+void JobThread::execute() {
+    QUENX_DEBUG("Thread %p starting", static_cast<const void*>(this));
+    msleep(kStartPause);
+    ++executionCount;
+    m_myJob->setJobState(JobStateRunning);
+    bool succeeded = false;
+    try {
+        succeeded = flash();
+    } catch (...) {
+        QUENX_DEBUG("Access to the KD is disabled at this moment.");
+        m_myJob->setLastError(kTimeoutErrorCode, "Timeout Error");
+    }
+    m_myJob->setJobState(succeeded ? JobStateCompleted : JobStateException);
+    m_executed = true;
+    QUENX_DEBUG("Thread %p finishing", static_cast<const void*>(this));
+}
+
+bool JobThread::flash() {
+    // Fails when the process has no locker; one that is busy does not matter.
+    const os::OSLocker::AutoOSLocker adapterLock;
+    const std::string adapterName = m_myJob->getAdapterName();
+    if (!holdsType(m_myJob->getImageTypes(), utils::FirmwareType::iSCSI)) resetBootType(adapterName);
+
+    std::uint32_t errorCode = 0;
+    std::string errorText;
+    QUENX_DEBUG("Writing FLASH Image");
+    const bool written = ma::writeFlashImage(adapterName, m_myJob->getFlashImage(),
+                                             m_myJob->getFlashImageSize(), errorCode, errorText);
+    m_myJob->setLastError(errorCode, errorText);
+    if (!written) return false;
+
+    QUENX_DEBUG("Updating CapabilityWord");
+    const bool updated =
+        ma::updateCapabilityWord(adapterName, m_myJob->getImageTypes(), errorCode, errorText);
+    m_myJob->setLastError(errorCode, errorText);
+    return updated;
+}
+
+/// An adapter that loses its iSCSI boot image must not go on trying to boot from it, on any of its functions.
+void JobThread::resetBootType(const std::string& adapterName) {
+    std::vector<utils::FirmwareVersionInfo> components;
+    ma::getAdapterFirmwareVersion(adapterName, components);
+    QUENX_DEBUG("MidApi returns %d firmwares", static_cast<int>(components.size()));
+    const bool hasIscsi = std::any_of(components.begin(), components.end(), [](const auto& component) {
+        return component.type == utils::FirmwareType::iSCSI;
+    });
+    if (!hasIscsi) return;
+    const utils::PCIAddr address = ma::getPCIAddress(adapterName);
+    for (const std::string& other : ma::enumerateAdapters()) {
+        if (ma::getPCIAddress(other).sameAdapter(address)) ma::setBootType(other, kDefaultBootType);
+    }
+}

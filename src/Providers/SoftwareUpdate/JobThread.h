@@ -1,0 +1,43 @@
+#pragma once
+
+#include <atomic>
+#include <cstdint>
+#include <string>
+#include <vector>
+
+#include "Utils/FirmwareTypes.h"
+#include "Utils/Os/Linux/Thread.h"
+
+class Quenx_ConcreteJob;
+
+/// The worker of one job: writes the prepared image to the adapter. A flash that has begun always runs to its
+/// end.
+class JobThread : public utils::Thread {
+  public:
+    /// The job outlives the worker. Throws the assertion for a null pointer.
+    explicit JobThread(Quenx_ConcreteJob* job);
+    /// Waits for a worker that has been started: 3 seconds politely, then until it ends.
+    ~JobThread() override;
+
+    void execute() override;
+    virtual void stopFwUpdateExecution();
+
+    /// Throws utils::Exception when the system refuses a thread; the worker counts as started all the same.
+    void start();
+    bool isExecuted() const { return m_executed == true; }
+    /// Asks the worker to stop and waits in steps of 50 ms. With a time-out that is a multiple of 50 the
+    /// result is always true, even when the worker is still running (intended).
+    bool terminate(int timeout);
+
+    /// Executions begun since the library was loaded.
+    static std::atomic<std::int32_t> executionCount;
+
+  private:
+    bool flash();
+    void resetBootType(const std::string& adapterName);
+
+    Quenx_ConcreteJob* m_myJob;
+    utils::Atomic<bool> m_executed;
+    utils::Atomic<bool> m_stopRequested;
+    utils::Atomic<bool> m_started;
+};

@@ -1,0 +1,56 @@
+#include "Providers/SoftwareUpdate/Quenx_AffectedJobElement.h"
+
+#include "Framework/CimBroker.h"
+#include "Providers/SoftwareUpdate/AdapterIndex.h"
+#include "Providers/SoftwareUpdate/Quenx_ConcreteJob.h"
+#include "Providers/SoftwareUpdate/Rebuild.h"
+#include "Providers/SoftwareUpdate/SoftwareUpdateAgent.h"
+#include "Utils/Debug.h"
+#include "Utils/Log.h"
+
+namespace {
+
+void associate(const Quenx_ConcreteJob& job, const CIM_ManagedElement* affected,
+               core::InstanceList& rebuilt) {
+    auto association = std::make_unique<Quenx_AffectedJobElement>();
+    association->AffectedElement = affected;
+    association->AffectingElement = &job;
+    association->ElementEffects.setNull();
+    association->OtherElementEffectsDescriptions.setNull();
+    rebuilt.add(association.release());
+}
+
+}  // namespace
+
+constinit const core::CimClassInfo Quenx_AffectedJobElement::classInfo{
+    "Quenx_AffectedJobElement", &CIM_AffectedJobElement::classInfo, true, {}, nullptr};
+
+Quenx_AffectedJobElement::~Quenx_AffectedJobElement() = default;
+
+std::string Quenx_AffectedJobElement::getClassName() const {
+    return classInfo.name;
+}
+
+std::string Quenx_AffectedJobElementClass::getClassName() {
+    return Quenx_AffectedJobElement::classInfo.name;
+}
+
+utils::SafeList<core::CimInstance*>::Iterator Quenx_AffectedJobElementClass::getInstances() {
+    QUENX_DEBUG("getInstances");
+    const utils::TimeStamp timing("Quenx_AffectedJobElementClass::getInstances");
+    rebuild(m_instances, [](core::InstanceList& rebuilt) {
+        core::InstanceRange jobs(core::GetCimBroker()->getInstances(
+            "Quenx_ConcreteJob", core::SoftwareUpdateAgent::CIM_PROVIDER_NAME));
+        const AdapterIndex adapters;
+        for (const core::CimInstance* each : jobs) {
+            const auto* job = dynamic_cast<const Quenx_ConcreteJob*>(each);
+            const IndexedPort* port = job == nullptr ? nullptr : adapters.findPort(job->getAdapterName());
+            if (port == nullptr) continue;
+            associate(*job, port->element, rebuilt);
+            for (const CIM_ManagedElement* controller : adapters.controllersOf(*port)) {
+                associate(*job, controller, rebuilt);
+            }
+        }
+    });
+    return m_instances.getElements(false);
+}

@@ -1,0 +1,180 @@
+#include "Providers/SoftwareUpdate/Quenx_ConcreteJob.h"
+
+#include <optional>
+
+#include "MidAPI/ma.h"
+#include "Providers/SoftwareUpdate/AdapterClaim.h"
+#include "Providers/SoftwareUpdate/JobThread.h"
+#include "Utils/Exception.h"
+#include "Utils/Log.h"
+#include "Utils/Utils.h"
+
+namespace {
+
+constexpr unsigned int kStartFailed = 4;
+constexpr unsigned int kUnsupportedState = 5;
+constexpr unsigned int kInvalidStateTransition = 4097;
+constexpr unsigned short kWholePercent = 100;
+
+bool hasEnded(JobStateVal state) {
+    return state == JobStateCompleted || state == JobStateException;
+}
+
+/// Whether a job in this state has given up its adapter; nothing for values that say neither. That Terminated
+/// and Killed count as unfinished is intended.
+std::optional<bool> isFinished(JobStateVal state) {
+    switch (state) {
+        case JobStateShuttingDown:
+        case JobStateCompleted:
+        case JobStateException:
+            return true;
+        case JobStateNew:
+        case JobStateStarting:
+        case JobStateRunning:
+        case JobStateSuspended:
+        case JobStateTerminated:
+        case JobStateKilled:
+        case JobStateService:
+        case JobStateQueryPending:
+            return false;
+    }
+    return std::nullopt;
+}
+
+}  // namespace
+
+constinit const core::CimClassInfo Quenx_ConcreteJob::classInfo{
+    "Quenx_ConcreteJob", &CIM_ConcreteJob::classInfo, false, {}, nullptr};
+
+// Built before, and so destroyed after, the agent at file scope: its destruction waits for workers that end
+// their jobs.
+__attribute__((init_priority(1000))) utils::Atomic<std::string> Quenx_ConcreteJob::m_servicedAdapter;
+
+Quenx_ConcreteJob::Quenx_ConcreteJob(std::string adapterName, int jobId, std::string& uri,
+                                     std::vector<unsigned short>& installOptions,
+                                     std::vector<std::string>& installOptionValues)
+    : m_adapterName(std::move(adapterName)), m_jobId(jobId) {
+    setDestructionWaits();
+    checkAndVerifyImage(m_adapterName, uri, installOptions, installOptionValues, m_flashImage,
+                        m_flashImageSize, m_imageTypes);
+    try {
+        m_myThread = std::make_unique<JobThread>(this);
+    } catch (...) {
+        releaseClaimIfConfigured(m_adapterName);
+        throw;
+    }
+    m_elapsedTime.setInterval(m_startTime);
+}
+
+Quenx_ConcreteJob::~Quenx_ConcreteJob() {
+    // The worker uses everything else here, so it ends first.
+    std::unique_ptr<JobThread> worker;
+    {
+        const utils::Mutex::AutoLocker lock(m_jobMutex);
+        worker = std::move(m_myThread);
+    }
+}
+
+std::string Quenx_ConcreteJob::getClassName() const {
+    return classInfo.name;
+}
+
+std::string Quenx_ConcreteJob::getUniqId() const {
+    return utils::formatStr("FirmwareUpdate@Job#%d", m_jobId);
+}
+
+const std::uint8_t* Quenx_ConcreteJob::getFlashImage() const {
+    const utils::Mutex::AutoLocker lock(m_stateMutex);
+    return m_flashImage.get();
+}
+
+std::uint32_t Quenx_ConcreteJob::getFlashImageSize() const {
+    const utils::Mutex::AutoLocker lock(m_stateMutex);
+    return m_flashImageSize;
+}
+
+JobStateVal Quenx_ConcreteJob::getJobState() const {
+    const utils::Mutex::AutoLocker lock(m_stateMutex);
+    return m_jobState;
+}
+
+void Quenx_ConcreteJob::setLastError(std::uint32_t code, std::string text) {
+    const utils::Mutex::AutoLocker lock(m_stateMutex);
+    m_lastErrorCode = code;
+    m_lastErrorText.swap(text);
+}
+
+void Quenx_ConcreteJob::setJobState(JobStateVal state) {
+    QUENX_DEBUG("%d -> %d", getJobState(), state);
+    std::unique_ptr<std::uint8_t[]> released;
+    const utils::Mutex::AutoLocker lock(m_stateMutex);
+    m_jobState = state;
+    m_timeOfLastStateChange.resetTimer();
+    m_finished = isFinished(state).value_or(m_finished);
+    if (state == JobStateCompleted) m_elapsedTime.setInterval(m_startTime);
+    if (!m_finished) return;
+    released.swap(m_flashImage);
+    m_flashImageSize = 0;
+    m_servicedAdapter = std::string();
+}
+
+unsigned int Quenx_ConcreteJob::requestStateChange(RequestedState state, utils::Time) {
+    QUENX_DEBUG("New request %d", state);
+    if (state != RequestedStateStart) {
+        QUENX_ERROR("Not supported new state %d", state);
+        return kUnsupportedState;
+    }
+    if (getJobState() != JobStateNew) {
+        QUENX_ERROR("Cannot start job that is not in 'NEW' state");
+        return kInvalidStateTransition;
+    }
+    QUENX_DEBUG("starting job");
+    setJobState(JobStateStarting);
+    if (threadControl(ThreadStart, 0)) return 0;
+    setJobState(JobStateException);
+    return kStartFailed;
+}
+
+unsigned short Quenx_ConcreteJob::getPercentComplete() {
+    const JobStateVal state = getJobState();
+    std::optional<unsigned short> percent;
+    if (state == JobStateRunning) {
+        try {
+            percent = ma::getFlashImageUpdateProgress(m_adapterName);
+        } catch (...) {
+            // The last known progress is a better answer than none for all jobs.
+        }
+    }
+    const utils::Mutex::AutoLocker lock(m_stateMutex);
+    // The worker may have ended the job while the progress was asked for.
+    if (hasEnded(m_jobState)) percent = kWholePercent;
+    if (percent) m_percentComplete = *percent;
+    return static_cast<unsigned short>(m_percentComplete);
+}
+
+bool Quenx_ConcreteJob::threadControl(ThreadOperationCommand command, int timeout) {
+    const utils::Mutex::AutoLocker lock(m_jobMutex);
+    QUENX_DEBUG("New threadControl %d", command);
+    if (command == ThreadStart) {
+        QUENX_ASSERT_TEXT(m_myThread != nullptr, __FILE__, __LINE__, "m_myThread != __null");
+        try {
+            m_myThread->start();
+        } catch (...) {
+            QUENX_ERROR("Thread start error");
+            return false;
+        }
+        return true;
+    }
+    if (command == ThreadTerminate) {
+        QUENX_ASSERT_TEXT(m_myThread != nullptr, __FILE__, __LINE__, "m_myThread != __null");
+        return m_myThread->terminate(timeout);
+    }
+    const bool disposing = command == ThreadDispose && m_myThread != nullptr && m_myThread->isExecuted();
+    if (disposing) {
+        QUENX_DEBUG("Deleting JobThread %p for %s", static_cast<const void*>(m_myThread.get()),
+                    m_adapterName.c_str());
+        m_myThread.reset();
+    }
+    QUENX_DEBUG("threadControl %d - DONE", command);
+    return disposing;
+}

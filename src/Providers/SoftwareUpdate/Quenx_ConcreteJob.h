@@ -1,0 +1,119 @@
+#pragma once
+
+#include <cstdint>
+#include <memory>
+#include <string>
+#include <vector>
+
+#include "Providers/Schema/CIM_ConcreteJob.h"
+#include "Utils/FirmwareTypes.h"
+#include "Utils/Os/Linux/Thread.h"
+#include "Utils/ThreadAnnotations.h"
+#include "Utils/Time.h"
+
+class JobThread;
+
+/// The values of CIM_ConcreteJob.JobState (DSP1103). The states from Suspended on that are not marked are
+/// never entered by this provider.
+enum JobStateVal : unsigned short {
+    JobStateNew = 2,
+    JobStateStarting = 3,
+    JobStateRunning = 4,
+    JobStateSuspended = 5,
+    JobStateShuttingDown = 6,
+    JobStateCompleted = 7,  ///< the worker succeeded
+    JobStateTerminated = 8,
+    JobStateKilled = 9,
+    JobStateException = 10,  ///< the worker failed, or could not be started
+    JobStateService = 11,
+    JobStateQueryPending = 12,
+};
+
+/// The requested states of jobs; only Start is accepted.
+enum RequestedState : unsigned short { RequestedStateStart = 2 };
+
+enum ThreadOperationCommand : int {
+    ThreadStart = 1,
+    ThreadTerminate = 2,  ///< ask the worker to stop, and wait
+    ThreadDispose = 3,    ///< destroy the worker if it has finished
+};
+
+/// One firmware update of one adapter, from the verified image to its end. Thread-safe.
+class Quenx_ConcreteJob : public CIM_ConcreteJob {
+  public:
+    static const core::CimClassInfo classInfo;
+
+    /// The adapter that is being serviced; empty when none is. Taken by image verification, given back by the
+    /// job that ends.
+    static utils::Atomic<std::string> m_servicedAdapter;
+
+    /// Verifies the image and claims the adapter; throws what checkAndVerifyImage() throws. Creates the
+    /// worker but does not start it.
+    Quenx_ConcreteJob(std::string adapterName, int jobId, std::string& uri,
+                      std::vector<unsigned short>& installOptions,
+                      std::vector<std::string>& installOptionValues);
+
+    std::string getClassName() const override;
+    /// Waits for a worker that has been started, and so for a flash that has begun.
+    ~Quenx_ConcreteJob() override;
+
+    /// Sets every property from the current state. Asks the adapter API for the progress of a running job.
+    virtual void refresh();
+    /// The one way to the worker; one command at a time per job. The time-out is in milliseconds and matters
+    /// to ThreadTerminate only. False when a start failed, a termination timed out, or there was nothing to
+    /// do.
+    virtual bool threadControl(ThreadOperationCommand command, int timeout);
+
+    std::string getUniqId() const;
+    std::string getAdapterName() const { return m_adapterName; }
+    std::vector<utils::FirmwareType> getImageTypes() const { return m_imageTypes; }
+    /// The prepared image; owned by the job and freed when it ends.
+    const std::uint8_t* getFlashImage() const;
+    std::uint32_t getFlashImageSize() const;
+    JobStateVal getJobState() const;
+
+    /// Keeps what the adapter API reported; the code is served cut to 16 bits.
+    void setLastError(std::uint32_t code, std::string text);
+    /// Enters a state. Ending the job frees the image and the adapter claim in the same step, so that whoever
+    /// sees the end can start the next update.
+    void setJobState(JobStateVal state);
+    /// 0 accepted, 4 the worker could not be started, 5 no such request, 4097 the job is not New. The
+    /// time-out is accepted and ignored.
+    unsigned int requestStateChange(RequestedState state, utils::Time timeout);
+    /// 100 for a job that has ended, well or not (intended).
+    unsigned short getPercentComplete();
+
+    /// The image types that the options ask for. Throws utils::EInvalidParameter, with the claim released,
+    /// for a type that is not known.
+    static std::vector<utils::FirmwareType> getTargetTypes(std::vector<unsigned short>& installOptions,
+                                                           std::vector<std::string>& installOptionValues);
+    /// Claims the adapter, reads the image, lets the adapter API prepare it and judges the answer. Throws the
+    /// refusals of UpdateExceptions.h; see AdapterClaim for what becomes of the claim.
+    /// @param image,imageSize,imageTypes  set on success: the prepared image, its length, the types to
+    /// install
+    static void checkAndVerifyImage(std::string adapterName, std::string& uri,
+                                    std::vector<unsigned short>& installOptions,
+                                    std::vector<std::string>& installOptionValues,
+                                    std::unique_ptr<std::uint8_t[]>& image, std::uint32_t& imageSize,
+                                    std::vector<utils::FirmwareType>& imageTypes);
+
+  private:
+    void setUnknownProperties();
+
+    const std::string m_adapterName;
+    const int m_jobId;
+    std::unique_ptr<JobThread> m_myThread QUENX_GUARDED_BY(m_jobMutex);
+    std::unique_ptr<std::uint8_t[]> m_flashImage QUENX_GUARDED_BY(m_stateMutex);
+    std::uint32_t m_flashImageSize QUENX_GUARDED_BY(m_stateMutex) = 0;
+    std::vector<utils::FirmwareType> m_imageTypes;  ///< set by the constructor only
+    const utils::Time m_startTime;
+    utils::Time m_elapsedTime QUENX_GUARDED_BY(m_stateMutex);
+    JobStateVal m_jobState QUENX_GUARDED_BY(m_stateMutex) = JobStateNew;
+    bool m_finished QUENX_GUARDED_BY(m_stateMutex) = false;
+    utils::Mutex m_jobMutex;  ///< one thread operation at a time
+    utils::Time m_timeOfLastStateChange QUENX_GUARDED_BY(m_stateMutex){0ULL};
+    std::uint32_t m_lastErrorCode QUENX_GUARDED_BY(m_stateMutex) = 0;
+    std::string m_lastErrorText QUENX_GUARDED_BY(m_stateMutex);
+    std::uint32_t m_percentComplete QUENX_GUARDED_BY(m_stateMutex) = 0;
+    mutable utils::Mutex m_stateMutex;  ///< what the worker writes and requests read; held for moments only
+};

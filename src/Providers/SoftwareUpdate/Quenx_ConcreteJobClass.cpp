@@ -1,0 +1,118 @@
+#include "Providers/SoftwareUpdate/Quenx_ConcreteJobClass.h"
+
+#include "Framework/CimBroker.h"
+#include "Framework/InstanceRange.h"
+#include "Framework/RequestScope.h"
+#include "Providers/SoftwareUpdate/AdapterClaim.h"
+#include "Providers/SoftwareUpdate/VerifyJobResult.h"
+#include "Utils/Debug.h"
+#include "Utils/Log.h"
+
+namespace {
+
+constexpr unsigned int kStartTimeout = 100;  // seconds
+
+void verifyImage(const std::string& adapterName, std::string& uri,
+                 std::vector<unsigned short>& installOptions, std::vector<std::string>& installOptionValues) {
+    std::unique_ptr<std::uint8_t[]> image;
+    std::uint32_t imageSize = 0;
+    std::vector<utils::FirmwareType> imageTypes;
+    Quenx_ConcreteJob::checkAndVerifyImage(adapterName, uri, installOptions, installOptionValues, image,
+                                           imageSize, imageTypes);
+    releaseClaimIfConfigured(adapterName);
+}
+
+}  // namespace
+
+Quenx_ConcreteJobClass::Quenx_ConcreteJobClass() : m_factory(this) {}
+
+Quenx_ConcreteJobClass::~Quenx_ConcreteJobClass() = default;
+
+std::string Quenx_ConcreteJobClass::getClassName() {
+    return Quenx_ConcreteJob::classInfo.name;
+}
+
+utils::SafeList<core::CimInstance*>::Iterator Quenx_ConcreteJobClass::getInstances() {
+    const utils::TimeStamp timing("ConcreteJob::getInstances");
+    core::InstanceRange jobs(m_instances.getElements(false));
+    QUENX_DEBUG("All jobs: %d", static_cast<int>(jobs.size()));
+    for (core::CimInstance* each : jobs) {
+        auto* job = static_cast<Quenx_ConcreteJob*>(each);
+        QUENX_DEBUG("Refreshing job: %s", job->getUniqId().c_str());
+        try {
+            job->threadControl(ThreadDispose, 0);
+        } catch (...) {
+            QUENX_DEBUG("Exception happened");
+        }
+        job->refresh();
+    }
+    QUENX_DEBUG("return %d", static_cast<int>(m_instances.size()));
+    return m_instances.getElements(false);
+}
+
+int Quenx_ConcreteJobClass::verifyOrCreateNewJob(std::string adapterName, std::string uri,
+                                                 std::vector<unsigned short>& installOptions,
+                                                 std::vector<std::string>& installOptionValues,
+                                                 Quenx_ConcreteJob*& job, bool create) {
+    const utils::TimeStamp timing("Quenx_ConcreteJobClass::createNewJob");
+    const core::RequestScope scope;  // a client may delete the job as soon as it is listed
+    job = nullptr;
+    try {
+        if (create) return createJob(adapterName, uri, installOptions, installOptionValues, job);
+        verifyImage(adapterName, uri, installOptions, installOptionValues);
+        return VerifyJobResult::Success;
+    } catch (...) {
+        return verifyJobResultOfCurrentException();
+    }
+}
+
+int Quenx_ConcreteJobClass::createJob(const std::string& adapterName, std::string& uri,
+                                      std::vector<unsigned short>& installOptions,
+                                      std::vector<std::string>& installOptionValues,
+                                      Quenx_ConcreteJob*& job) {
+    // Taken even if no job comes of it, so ids can have gaps (intended).
+    const std::int32_t id = m_nextJobId++;
+    QUENX_DEBUG("Creating new job for %s with id #%d", adapterName.c_str(), id);
+    auto* created = new Quenx_ConcreteJob(adapterName, id, uri, installOptions, installOptionValues);
+    bool listed = false;
+    try {
+        m_instances.add(created);
+        listed = true;
+        created->refresh();
+        utils::Time timeout;
+        timeout.setIntervalInSeconds(kStartTimeout);
+        if (created->requestStateChange(RequestedStateStart, timeout) == 0) {
+            job = created;
+            return VerifyJobResult::Success;
+        }
+    } catch (...) {
+        if (listed) m_instances.remove(created);
+        releaseClaimIfConfigured(adapterName);
+        throw;
+    }
+    // Its destruction waits for a thread that never ran, so it is left to the list's release.
+    m_instances.remove(created);
+    return VerifyJobResult::JobStartFailed;
+}
+
+int Quenx_ConcreteJobClass::DeleteInstance(core::CimPath& path) {
+    QUENX_DEBUG("DeleteInstance");
+    const core::RequestScope scope;  // another request may delete the same job meanwhile
+    core::CimBroker* broker = core::GetCimBroker();
+    QUENX_DEBUG("All jobs: %d", static_cast<int>(m_instances.size()));
+    Quenx_ConcreteJob* job = nullptr;
+    try {
+        job = dynamic_cast<Quenx_ConcreteJob*>(broker->getInstanceByPath(path));
+    } catch (...) {
+        // The same as a path that names nothing.
+    }
+    if (job == nullptr) {
+        // The misspelt class name is intended, and so is the last place, for which there is no value.
+        QUENX_ERROR("Quenx_ConcreteJobe_Provider.DeleteInstance: instance not found '%s' (%%s)",
+                    path.toString().c_str());
+        return core::kDeleteNotFound;
+    }
+    QUENX_DEBUG("Removing job: %s", job->getUniqId().c_str());
+    job->setDeleted(true);
+    return 0;
+}

@@ -1,0 +1,49 @@
+#pragma once
+
+#include <atomic>
+#include <string>
+#include <vector>
+
+#include "Framework/CimClass.h"
+#include "Providers/SoftwareUpdate/ConcreteJobFactory.h"
+#include "Providers/SoftwareUpdate/Quenx_ConcreteJob.h"
+
+/// The registry of all jobs. Jobs stay listed until a client deletes them; ids start at 1 with every load of
+/// the library. Thread-safe.
+class Quenx_ConcreteJobClass : public core::CimClass {
+  public:
+    using Instance = Quenx_ConcreteJob;
+
+    Quenx_ConcreteJobClass();
+
+    std::string getClassName() override;
+    /// Refreshes every job, and disposes of workers that have finished.
+    utils::SafeList<core::CimInstance*>::Iterator getInstances() override;
+    ~Quenx_ConcreteJobClass() override;
+
+    /// Verifies an image for an adapter, and with `create` makes a job of it and starts it. Never throws for
+    /// a refusal: returns a VerifyJobResult code.
+    /// @param job  set with `create` and code 0 only, else null; stays owned by the registry
+    /// A successful check without `create` leaves the adapter claimed (intended): no update can start until
+    /// the process ends, unless the configuration says ReleaseClaimAfterCheck.
+    virtual int verifyOrCreateNewJob(std::string adapterName, std::string uri,
+                                     std::vector<unsigned short>& installOptions,
+                                     std::vector<std::string>& installOptionValues, Quenx_ConcreteJob*& job,
+                                     bool create);
+
+    /// 0, or 90 when the path names no job. The job disappears at once; a flash that has begun goes on to its
+    /// end.
+    int DeleteInstance(core::CimPath& path);
+
+    /// Lists a job that was built elsewhere; takes ownership.
+    void addJob(Quenx_ConcreteJob* job) { m_instances.add(job); }
+
+  private:
+    int createJob(const std::string& adapterName, std::string& uri,
+                  std::vector<unsigned short>& installOptions, std::vector<std::string>& installOptionValues,
+                  Quenx_ConcreteJob*& job);
+
+    core::InstanceList m_instances;
+    std::atomic<std::int32_t> m_nextJobId{1};
+    ConcreteJobFactory m_factory;
+};

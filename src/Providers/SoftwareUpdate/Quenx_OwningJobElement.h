@@ -1,0 +1,25 @@
+#pragma once
+
+#include "Framework/CimClass.h"
+#include "Providers/Schema/CIM_OwningJobElement.h"
+
+/// The service owns a job.
+class Quenx_OwningJobElement : public CIM_OwningJobElement {
+  public:
+    static const core::CimClassInfo classInfo;
+
+    std::string getClassName() const override;
+    ~Quenx_OwningJobElement() override;
+};
+
+/// Rebuilt on every enumeration. Throws the assertion unless there is one service.
+class Quenx_OwningJobElementClass : public core::CimClass {
+  public:
+    using Instance = Quenx_OwningJobElement;
+
+    std::string getClassName() override;
+    utils::SafeList<core::CimInstance*>::Iterator getInstances() override;
+
+  private:
+    core::InstanceList m_instances;
+};

@@ -1,0 +1,81 @@
+#include "Providers/SoftwareUpdate/Quenx_ServiceAffectsElement.h"
+
+#include <algorithm>
+
+#include "Framework/CimBroker.h"
+#include "MidAPI/ma.h"
+#include "Providers/Schema/CIM_Service.h"
+#include "Providers/SoftwareUpdate/AdapterIndex.h"
+#include "Providers/SoftwareUpdate/Quenx_SoftwareInstallationServiceCapabilities.h"
+#include "Providers/SoftwareUpdate/Rebuild.h"
+#include "Providers/SoftwareUpdate/ServiceLookup.h"
+#include "Utils/Debug.h"
+#include "Utils/Log.h"
+
+namespace {
+
+void associate(const CIM_Service* service, const CIM_ManagedElement* affected, core::InstanceList& rebuilt) {
+    auto association = std::make_unique<Quenx_ServiceAffectsElement>();
+    association->AffectedElement = affected;
+    association->AffectingElement = service;
+    association->ElementEffects.setNull();
+    association->OtherElementEffectsDescriptions.setNull();
+    association->AssignedSequence.setNull();
+    rebuilt.add(association.release());
+}
+
+bool isSupportedType(const std::string& type) {
+    constexpr auto& names = Quenx_SoftwareInstallationServiceCapabilities::TargetTypesDescription;
+    return std::find(std::next(names.begin()), names.end(), type) != names.end();
+}
+
+/// A firmware image with target types, all of which the service supports.
+bool isInstallable(const inventory::SoftwareIdentity& identity) {
+    if (identity.getTypeCode() != inventory::SoftwareIdentity::FIRMWARE_IMAGE) return false;
+    const utils::StringArray types = identity.getTargetTypes();
+    return !types.empty() && std::all_of(types.begin(), types.end(), isSupportedType);
+}
+
+void associateAdapters(const CIM_Service* service, core::InstanceList& rebuilt) {
+    const AdapterIndex adapters;
+    for (const IndexedPort& port : adapters.ports()) {
+        const auto controllers = adapters.controllersOf(port);
+        if (controllers.empty() || !ma::getCanBeUpdated(port.adapterName)) continue;
+        for (const CIM_ManagedElement* controller : controllers) {
+            associate(service, port.element, rebuilt);
+            associate(service, controller, rebuilt);
+        }
+    }
+}
+
+}  // namespace
+
+constinit const core::CimClassInfo Quenx_ServiceAffectsElement::classInfo{
+    "Quenx_ServiceAffectsElement", &CIM_ServiceAffectsElement::classInfo, true, {}, nullptr};
+
+Quenx_ServiceAffectsElement::~Quenx_ServiceAffectsElement() = default;
+
+std::string Quenx_ServiceAffectsElement::getClassName() const {
+    return classInfo.name;
+}
+
+std::string Quenx_ServiceAffectsElementClass::getClassName() {
+    return Quenx_ServiceAffectsElement::classInfo.name;
+}
+
+utils::SafeList<core::CimInstance*>::Iterator Quenx_ServiceAffectsElementClass::getInstances() {
+    QUENX_DEBUG("getInstances");
+    const utils::TimeStamp timing("Quenx_ServiceAffectsElementClass::getInstances");
+    rebuild(m_instances, [](core::InstanceList& rebuilt) {
+        const auto instance = theService();
+        const auto* service = dynamic_cast<const CIM_Service*>(instance.get());
+        associateAdapters(service, rebuilt);
+        for (const core::CimInstance* each :
+             core::InstanceRange(core::GetCimBroker()->getInstances("Quenx_SoftwareIdentity", ""))) {
+            const auto* identity = dynamic_cast<const inventory::SoftwareIdentity*>(each);
+            if (identity == nullptr || !isInstallable(*identity)) continue;
+            associate(service, dynamic_cast<const CIM_ManagedElement*>(each), rebuilt);
+        }
+    });
+    return m_instances.getElements(false);
+}

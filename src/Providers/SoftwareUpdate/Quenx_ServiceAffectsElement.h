@@ -1,0 +1,27 @@
+#pragma once
+
+#include "Framework/CimClass.h"
+#include "Providers/Schema/CIM_ServiceAffectsElement.h"
+
+/// The service can update a port, its card, or a firmware image can be installed by it.
+class Quenx_ServiceAffectsElement : public CIM_ServiceAffectsElement {
+  public:
+    static const core::CimClassInfo classInfo;
+
+    std::string getClassName() const override;
+    ~Quenx_ServiceAffectsElement() override;
+};
+
+/// Rebuilt on every enumeration; the cost is ports + controllers + identities. Throws the assertion unless
+/// there is one service. A card with several ports that can be updated has one association for each
+/// (intended).
+class Quenx_ServiceAffectsElementClass : public core::CimClass {
+  public:
+    using Instance = Quenx_ServiceAffectsElement;
+
+    std::string getClassName() override;
+    utils::SafeList<core::CimInstance*>::Iterator getInstances() override;
+
+  private:
+    core::InstanceList m_instances;
+};

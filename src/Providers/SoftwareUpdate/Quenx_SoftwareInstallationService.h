@@ -1,0 +1,42 @@
+#pragma once
+
+#include <string>
+#include <vector>
+
+#include "Framework/CimClass.h"
+#include "Providers/Schema/CIM_SoftwareInstallationService.h"
+#include "Providers/SingletonInstanceClass.h"
+
+/// The one software installation service (DSP1025), with its extrinsic methods. The methods return the values
+/// of the DMTF value map; only argument errors, a missing job registry and failed assertions leave them as
+/// exceptions.
+class Quenx_SoftwareInstallationService : public CIM_SoftwareInstallationService {
+  public:
+    static const core::CimClassInfo classInfo;
+
+    Quenx_SoftwareInstallationService();
+    std::string getClassName() const override;
+    ~Quenx_SoftwareInstallationService() override;
+
+    virtual void refresh();
+    /// Verifies the image at a URI and starts a job that installs it. 4096 and the job on success.
+    virtual unsigned int InstallFromURI(core::CimPropertyList& in, core::CimPropertyList& out,
+                                        core::CimInstance*& job);
+    /// The same for an image that the inventory knows.
+    virtual unsigned int InstallFromSoftwareIdentity(core::CimPropertyList& in, core::CimPropertyList& out,
+                                                     core::CimInstance*& job);
+    /// Only verifies; 0 on success. No job is created, but the adapter stays claimed (intended).
+    virtual unsigned int CheckSoftwareIdentity(core::CimPropertyList& in, core::CimPropertyList& out,
+                                               core::CimInstance*& job);
+
+    /// "FirmwareUpdate", for every instance.
+    static std::string getUniqId() { return "FirmwareUpdate"; }
+    static bool IsValueDefined(unsigned short value, const std::vector<unsigned short>& values);
+};
+
+class Quenx_SoftwareInstallationServiceClass
+    : public SingletonInstanceClass<Quenx_SoftwareInstallationService> {
+  public:
+    Quenx_SoftwareInstallationServiceClass()
+        : SingletonInstanceClass("SoftwareInstallationService::getInstances") {}
+};

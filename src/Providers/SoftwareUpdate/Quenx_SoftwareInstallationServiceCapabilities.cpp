@@ -1,0 +1,59 @@
+#include "Providers/SoftwareUpdate/Quenx_SoftwareInstallationServiceCapabilities.h"
+
+#include "Providers/SoftwareUpdate/InstallOptions.h"
+#include "Providers/SoftwareUpdate/Quenx_SoftwareInstallationService.h"
+#include "Utils/Utils.h"
+
+namespace {
+
+// Values of the DMTF value maps of CIM_SoftwareInstallationServiceCapabilities.
+constexpr unsigned short kInstallFromSoftwareIdentity = 3;
+constexpr unsigned short kInstallFromUri = 5;
+constexpr unsigned short kNoSynchronousAction = 2;
+constexpr unsigned short kNoExtendedResourceType = 2;
+constexpr unsigned short kFileScheme = 3;
+
+}  // namespace
+
+constinit const core::CimClassInfo Quenx_SoftwareInstallationServiceCapabilities::classInfo{
+    "Quenx_SoftwareInstallationServiceCapabilities",
+    &CIM_SoftwareInstallationServiceCapabilities::classInfo,
+    false,
+    {},
+    nullptr};
+
+Quenx_SoftwareInstallationServiceCapabilities::~Quenx_SoftwareInstallationServiceCapabilities() = default;
+
+std::string Quenx_SoftwareInstallationServiceCapabilities::getClassName() const {
+    return classInfo.name;
+}
+
+std::string Quenx_SoftwareInstallationServiceCapabilities::getUniqId() {
+    return fmt("Capabilities@%s", Quenx_SoftwareInstallationService::getUniqId().c_str());
+}
+
+void Quenx_SoftwareInstallationServiceCapabilities::refresh() {
+    const core::RecursiveLocker lock(getMutex());
+    Caption = "Capabilities for Ethernet Firmware Update";
+    Description = "Capabilities for Firmware Update Service for Tarvel(R) Ethernet Adapters";
+    ElementName = Caption;
+    Generation.setNull();
+    InstanceID = fmt("Quenx:%s", getUniqId().c_str());
+
+    SupportedAsynchronousActions = {kInstallFromUri, kInstallFromSoftwareIdentity};
+    SupportedSynchronousActions = {kNoSynchronousAction};
+    SupportedTargetTypes.setNull();
+    for (std::size_t i = 1; i < TargetTypesDescription.size(); ++i) {
+        SupportedTargetTypes.push_back(TargetTypesDescription[i]);
+    }
+    SupportedExtendedResourceTypes = {kNoExtendedResourceType};
+    CanAddToCollection = false;
+    SupportedInstallOptions = {InstallOption::ForceInstallation, InstallOption::Update,
+                               InstallOption::TargetTypes};
+    OtherSupportedExtendedResourceTypeDescriptions.setNull();
+    SupportedExtendedResourceTypesMajorVersions.setNull();
+    SupportedExtendedResourceTypesMinorVersions.setNull();
+    SupportedExtendedResourceTypesRevisionNumbers.setNull();
+    SupportedExtendedResourceTypesBuildNumbers.setNull();
+    SupportedURISchemes = {kFileScheme};
+}

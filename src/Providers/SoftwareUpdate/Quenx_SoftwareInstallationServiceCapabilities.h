@@ -1,0 +1,31 @@
+#pragma once
+
+#include <array>
+#include <string>
+
+#include "Providers/Schema/CIM_SoftwareInstallationServiceCapabilities.h"
+#include "Providers/SingletonInstanceClass.h"
+
+/// What the software installation service can do (DSP1025).
+class Quenx_SoftwareInstallationServiceCapabilities : public CIM_SoftwareInstallationServiceCapabilities {
+  public:
+    static const core::CimClassInfo classInfo;
+
+    /// The names of the target types; the index is the utils::FirmwareType. Entry 0 is never published.
+    static constexpr std::array<const char*, 6> TargetTypesDescription = {"",        "IMG_CLP",  "IMG_iSCSI",
+                                                                          "IMG_PXE", "IMG_UEFI", "IMG_FCoE"};
+
+    std::string getClassName() const override;
+    ~Quenx_SoftwareInstallationServiceCapabilities() override;
+
+    virtual std::string getUniqId();
+    virtual void refresh();
+};
+
+class Quenx_SoftwareInstallationServiceCapabilitiesClass
+    : public SingletonInstanceClass<Quenx_SoftwareInstallationServiceCapabilities> {
+  public:
+    // The label is the service's (intended).
+    Quenx_SoftwareInstallationServiceCapabilitiesClass()
+        : SingletonInstanceClass("SoftwareInstallationService::getInstances") {}
+};

@@ -1,0 +1,48 @@
+#include "Providers/SoftwareUpdate/Quenx_SoftwareUpdateElementCapabilities.h"
+
+#include "Framework/CimBroker.h"
+#include "Providers/Schema/CIM_Capabilities.h"
+#include "Providers/Schema/CIM_ManagedElement.h"
+#include "Providers/SoftwareUpdate/ServiceLookup.h"
+#include "Utils/Debug.h"
+#include "Utils/Exception.h"
+#include "Utils/Log.h"
+
+namespace {
+
+// Values of the DMTF value map of CIM_ElementCapabilities.Characteristics.
+constexpr unsigned short kDefault = 2;
+constexpr unsigned short kCurrent = 3;
+
+}  // namespace
+
+constinit const core::CimClassInfo Quenx_SoftwareUpdateElementCapabilities::classInfo{
+    "Quenx_ElementCapabilities", &CIM_ElementCapabilities::classInfo, true, {}, nullptr};
+
+Quenx_SoftwareUpdateElementCapabilities::~Quenx_SoftwareUpdateElementCapabilities() = default;
+
+std::string Quenx_SoftwareUpdateElementCapabilities::getClassName() const {
+    return classInfo.name;
+}
+
+std::string Quenx_SoftwareUpdateElementCapabilitiesClass::getClassName() {
+    return Quenx_SoftwareUpdateElementCapabilities::classInfo.name;
+}
+
+utils::SafeList<core::CimInstance*>::Iterator Quenx_SoftwareUpdateElementCapabilitiesClass::getInstances() {
+    QUENX_DEBUG("getInstances");
+    const utils::TimeStamp timing("Quenx_SoftwareUpdateElementCapabilitiesClass::getInstances");
+    const utils::Mutex::AutoLocker lock(m_creation);
+    if (m_instances.size() == 0) {
+        const auto service = theService();
+        auto capabilities =
+            core::GetCimBroker()->getInstances("Quenx_SoftwareInstallationServiceCapabilities", "");
+        QUENX_ASSERT_TEXT(capabilities.size() == 1, __FILE__, __LINE__, "(int)capabilities.size() == 1");
+        auto association = std::make_unique<Quenx_SoftwareUpdateElementCapabilities>();
+        association->ManagedElement = dynamic_cast<const CIM_ManagedElement*>(service.get());
+        association->Capabilities = dynamic_cast<const CIM_Capabilities*>(capabilities.first());
+        association->Characteristics = {kDefault, kCurrent};
+        m_instances.add(association.release());
+    }
+    return m_instances.getElements(false);
+}

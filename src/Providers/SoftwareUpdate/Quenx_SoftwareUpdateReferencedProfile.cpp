@@ -1,0 +1,47 @@
+#include "Providers/SoftwareUpdate/Quenx_SoftwareUpdateReferencedProfile.h"
+
+#include "Framework/CimBroker.h"
+#include "Providers/Schema/CIM_RegisteredProfile.h"
+#include "Providers/SoftwareUpdate/ProfileNames.h"
+#include "Providers/SoftwareUpdate/Rebuild.h"
+#include "Utils/Debug.h"
+#include "Utils/Log.h"
+
+constinit const core::CimClassInfo Quenx_SoftwareUpdateReferencedProfile::classInfo{
+    "Quenx_ReferencedProfile", &CIM_ReferencedProfile::classInfo, true, {}, nullptr};
+
+Quenx_SoftwareUpdateReferencedProfile::~Quenx_SoftwareUpdateReferencedProfile() = default;
+
+std::string Quenx_SoftwareUpdateReferencedProfile::getClassName() const {
+    return classInfo.name;
+}
+
+std::string Quenx_SoftwareUpdateReferencedProfileClass::getClassName() {
+    return Quenx_SoftwareUpdateReferencedProfile::classInfo.name;
+}
+
+utils::SafeList<core::CimInstance*>::Iterator Quenx_SoftwareUpdateReferencedProfileClass::getInstances() {
+    QUENX_DEBUG("getInstances");
+    const utils::TimeStamp timing("ReferencedProfile::getInstances");
+    rebuild(m_instances, [](core::InstanceList& rebuilt) {
+        core::InstanceRange profiles(core::GetCimBroker()->getInstances("Quenx_RegisteredProfile", ""));
+        QUENX_DEBUG("Quenx_RegisteredProfile return %d instances", static_cast<int>(profiles.size()));
+        // The last of several with one InstanceID wins (intended).
+        const CIM_RegisteredProfile* antecedent = nullptr;
+        const CIM_RegisteredProfile* dependent = nullptr;
+        for (const core::CimInstance* each : profiles) {
+            const auto* profile = dynamic_cast<const CIM_RegisteredProfile*>(each);
+            if (profile == nullptr) continue;
+            const std::string id = profile->InstanceID.get();
+            if (id == ProfileName::EthernetPort) antecedent = profile;
+            if (id == ProfileName::SoftwareUpdate) dependent = profile;
+        }
+        if (antecedent == nullptr || dependent == nullptr) return;
+        auto reference = std::make_unique<Quenx_SoftwareUpdateReferencedProfile>();
+        reference->Antecedent = antecedent;
+        reference->Dependent = dependent;
+        rebuilt.add(reference.release());
+    });
+    QUENX_DEBUG("return %d", static_cast<int>(m_instances.size()));
+    return m_instances.getElements(false);
+}

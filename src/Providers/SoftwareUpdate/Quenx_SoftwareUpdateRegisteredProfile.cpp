@@ -1,0 +1,36 @@
+#include "Providers/SoftwareUpdate/Quenx_SoftwareUpdateRegisteredProfile.h"
+
+#include "Providers/SoftwareUpdate/ProfileNames.h"
+
+namespace {
+
+// Values of the DMTF value maps of CIM_RegisteredProfile.
+constexpr unsigned short kSpecificationType = 2;
+constexpr unsigned short kOrganizationDmtf = 2;
+constexpr unsigned short kAdvertiseOther = 1;
+
+}  // namespace
+
+constinit const core::CimClassInfo Quenx_SoftwareUpdateRegisteredProfile::classInfo{
+    "Quenx_RegisteredProfile", &CIM_RegisteredProfile::classInfo, false, {}, nullptr};
+
+Quenx_SoftwareUpdateRegisteredProfile::~Quenx_SoftwareUpdateRegisteredProfile() = default;
+
+std::string Quenx_SoftwareUpdateRegisteredProfile::getClassName() const {
+    return classInfo.name;
+}
+
+void Quenx_SoftwareUpdateRegisteredProfile::refresh() {
+    const core::RecursiveLocker lock(getMutex());
+    InstanceID = ProfileName::SoftwareUpdate;
+    SpecificationType = kSpecificationType;
+    RegisteredOrganization = kOrganizationDmtf;
+    OtherRegisteredOrganization.setNull();
+    RegisteredName = "Software Update";
+    RegisteredVersion = "1.0.0";
+    AdvertiseTypes = {kAdvertiseOther};
+    AdvertiseTypeDescriptions = std::vector<std::string>{"WS-Identify"};
+    Caption = RegisteredName;
+    Description = "Software Update Profile for Tarvel(R) Ethernet Adapters";
+    ElementName.setNull();
+}

@@ -1,0 +1,23 @@
+#pragma once
+
+#include "Providers/Schema/CIM_RegisteredProfile.h"
+#include "Providers/SingletonInstanceClass.h"
+
+/// Says that this provider implements the DMTF Software Update profile (DSP1025, registered as in DSP1033).
+class Quenx_SoftwareUpdateRegisteredProfile : public CIM_RegisteredProfile {
+  public:
+    /// Named "Quenx_RegisteredProfile": every provider serves its profile under this class.
+    static const core::CimClassInfo classInfo;
+
+    std::string getClassName() const override;
+    ~Quenx_SoftwareUpdateRegisteredProfile() override;
+
+    virtual void refresh();
+};
+
+class Quenx_SoftwareUpdateRegisteredProfileClass
+    : public SingletonInstanceClass<Quenx_SoftwareUpdateRegisteredProfile> {
+  public:
+    Quenx_SoftwareUpdateRegisteredProfileClass()
+        : SingletonInstanceClass("RegisteredProfile::getInstances") {}
+};

@@ -1,0 +1,34 @@
+#include "Utils/Debug.h"
+
+#include <utility>
+
+#include "Utils/Log.h"
+#include "Utils/Os/Linux/linux.h"
+#include "Utils/Utils.h"
+
+namespace utils {
+
+TimeStamp::TimeStamp() : m_name(formatStr("%p", static_cast<void*>(this))) {
+    Init(true);
+}
+
+TimeStamp::TimeStamp(std::string name) : m_name(std::move(name)) {
+    Init(false);
+}
+
+TimeStamp::TimeStamp(std::string name, bool logStart) : m_name(std::move(name)) {
+    Init(logStart);
+}
+
+void TimeStamp::Init(bool logStart) {
+    m_start = os::getuSecondsSinceEpoch();
+    if (logStart) QUENX_DEBUG("<%s>", m_name.c_str());
+}
+
+TimeStamp::~TimeStamp() {
+    const std::uint64_t milliseconds = (os::getuSecondsSinceEpoch() - m_start) / 1000;
+    // Intended: only the low 32 bits are shown, as a signed number.
+    QUENX_DEBUG("time(%s) = %dms ", m_name.c_str(), static_cast<std::int32_t>(milliseconds));
+}
+
+}  // namespace utils

@@ -1,0 +1,194 @@
+#include "Utils/Log.h"
+
+#include <execinfo.h>
+#include <syslog.h>
+
+#include <cerrno>
+#include <cinttypes>
+#include <cstdarg>
+#include <cstdlib>
+#include <cstring>
+#include <memory>
+#include <mutex>
+#include <vector>
+
+#include "Utils/Os/Linux/linux.h"
+#include "Utils/Utils.h"
+#include "Utils/VFormat.h"
+
+namespace utils {
+
+std::atomic<std::int32_t> logLevel{-1};
+
+namespace {
+
+constexpr const char* levelVariable = "TARVEL_SMASHv2_LOG_LEVEL";
+constexpr const char* banner = "Quenx Management Provider, Tarvel, 2026";
+constexpr int backtraceDepth = 40;
+// logBacktrace itself, the writer that called it, and the writer's caller.
+constexpr std::size_t skippedFrames = 3;
+
+std::mutex openMutex;
+
+/// Leaves errno as it was found, and gives it back in between to those who print it.
+class ErrnoKeeper {
+  public:
+    ErrnoKeeper() noexcept : m_saved(errno) {}
+    ~ErrnoKeeper() { errno = m_saved; }
+    ErrnoKeeper(const ErrnoKeeper&) = delete;
+    ErrnoKeeper& operator=(const ErrnoKeeper&) = delete;
+    void restore() const noexcept { errno = m_saved; }
+
+  private:
+    const int m_saved;
+};
+
+std::int32_t levelFromEnvironment() noexcept {
+    const char* const text = os::getEnvVariable(levelVariable);
+    if (text != nullptr && text[0] == '0') return 0;
+    if (text != nullptr && text[0] == '2') return 2;
+    return 1;
+}
+
+bool isControl(char c) {
+    return static_cast<unsigned char>(c) < 0x20 || c == 0x7F;
+}
+
+/// The line is handed to syslog as its format. Only the conversions that need no argument may stay, and no
+/// control character may forge a second line.
+std::string escapeForSyslog(const std::string& line) {
+    std::string format;
+    format.reserve(line.size() + 16);
+    for (std::size_t i = 0; i < line.size(); ++i) {
+        const char c = line[i];
+        if (isControl(c)) {
+            format += formatStr("#%03o", static_cast<unsigned>(c));
+        } else if (c != '%') {
+            format += c;
+        } else if (i + 1 < line.size() && (line[i + 1] == '%' || line[i + 1] == 'm')) {
+            format += c;
+            format += line[++i];
+        } else {
+            format += "%%";
+        }
+    }
+    return format;
+}
+
+// The format is no literal on purpose; escapeForSyslog has made it harmless.
+#pragma GCC diagnostic push
+#pragma GCC diagnostic ignored "-Wformat-security"
+#pragma GCC diagnostic ignored "-Wformat-nonliteral"
+void handOver(int priority, const std::string& line, const ErrnoKeeper& callersErrno) {
+    const std::string format = escapeForSyslog(line);
+    callersErrno.restore();
+    syslog(priority, format.c_str());
+}
+#pragma GCC diagnostic pop
+
+}  // namespace
+
+void openLinuxLog() noexcept {
+    if (logLevel.load(std::memory_order_acquire) != -1) return;
+    const ErrnoKeeper callersErrno;
+    std::lock_guard<std::mutex> lock(openMutex);
+    if (logLevel.load() != -1) return;
+    const std::int32_t level = levelFromEnvironment();
+    openlog("quenx", LOG_CONS, LOG_USER);
+    syslog(LOG_NOTICE, "Opening log, level=%d", level);
+    syslog(LOG_NOTICE, "%s", banner);
+    logLevel.store(level);
+}
+
+bool isDebugLogged() noexcept {
+    openLinuxLog();
+    return logLevel.load(std::memory_order_relaxed) >= 2;
+}
+
+bool isErrorLogged() noexcept {
+    openLinuxLog();
+    return logLevel.load(std::memory_order_relaxed) >= 1;
+}
+
+std::string formatLogMessage(const char* file, const char* function, int line, const char* level,
+                             const std::string& message) {
+    const char* const slash = std::strrchr(file, '/');
+    return formatStr("[%s] \"%s\" (%s@%s:%d)", level, message.c_str(), function,
+                     slash == nullptr ? file : slash + 1, line);
+}
+
+__attribute__((noinline)) void writeErrorLog(const char* file, const char* function, int line,
+                                             std::string message) noexcept {
+    const ErrnoKeeper callersErrno;
+    if (!isErrorLogged()) return;
+    try {
+        handOver(LOG_ERR, formatLogMessage(file, function, line, "error", message), callersErrno);
+    } catch (...) {
+    }
+    logBacktrace(LOG_ERR, backtraceDepth, logLevel.load() > 1);
+}
+
+void writeDebugLog(const char* file, const char* function, int line, std::string message) noexcept {
+    const ErrnoKeeper callersErrno;
+    if (!isDebugLogged()) return;
+    try {
+        // Intended: debug lines have the priority of errors and differ only in their level word.
+        handOver(LOG_ERR, formatLogMessage(file, function, line, "debug", message), callersErrno);
+    } catch (...) {
+    }
+}
+
+__attribute__((noinline)) void logBacktrace(int priority, int depth, bool withSymbols) noexcept {
+    const ErrnoKeeper callersErrno;
+    if (depth <= 0) return;
+    try {
+        std::vector<void*> frames(static_cast<std::size_t>(depth));
+        const int captured = backtrace(frames.data(), depth);
+        frames.resize(static_cast<std::size_t>(captured));
+
+        std::string text = "  Backtrace: ";
+        for (std::size_t i = skippedFrames; i < frames.size(); ++i) {
+            text += formatStr("%08" PRIxPTR " ", reinterpret_cast<std::uintptr_t>(frames[i]));
+        }
+        handOver(priority, text, callersErrno);
+
+        if (!withSymbols) return;
+        const std::unique_ptr<char*, decltype(&std::free)> symbols(backtrace_symbols(frames.data(), captured),
+                                                                   &std::free);
+        if (symbols == nullptr) return;
+        for (std::size_t i = skippedFrames; i < frames.size(); ++i) {
+            handOver(priority, formatStr("  %s ", symbols.get()[i]), callersErrno);
+        }
+    } catch (...) {
+    }
+}
+
+void formatDebugLog(const char* file, const char* function, int line, const char* format, ...) noexcept {
+    if (!isDebugLogged()) return;
+    const ErrnoKeeper callersErrno;
+    va_list arguments;
+    va_start(arguments, format);
+    try {
+        std::string message = vformatStr(format, arguments);
+        callersErrno.restore();
+        writeDebugLog(file, function, line, std::move(message));
+    } catch (...) {
+    }
+    va_end(arguments);
+}
+
+void formatErrorLog(const char* file, const char* function, int line, const char* format, ...) noexcept {
+    if (!isErrorLogged()) return;
+    const ErrnoKeeper callersErrno;
+    va_list arguments;
+    va_start(arguments, format);
+    try {
+        std::string message = vformatStr(format, arguments);
+        callersErrno.restore();
+        writeErrorLog(file, function, line, std::move(message));
+    } catch (...) {
+    }
+    va_end(arguments);
+}
+
+}  // namespace utils

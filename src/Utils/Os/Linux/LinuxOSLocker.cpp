@@ -1,0 +1,46 @@
+#include "Utils/Os/Linux/LinuxOSLocker.h"
+
+#include "Utils/Log.h"
+
+template class utils::Singleton<os::OSLocker>;
+
+namespace os {
+
+namespace {
+
+constexpr int taken = 0;
+constexpr int busy = 2;
+
+}  // namespace
+
+OSLocker::OSLocker() = default;
+OSLocker::~OSLocker() = default;
+
+OSLocker::AutoOSLocker::AutoOSLocker() {
+    QUENX_DEBUG("autolocking semaphore");
+    // Intended: the status is not looked at, the lock is advisory.
+    OSLocker::getInstance()->Lock();
+}
+
+OSLocker::AutoOSLocker::~AutoOSLocker() {
+    QUENX_DEBUG("autoreleasing semaphore");
+    try {
+        OSLocker::getInstance()->UnLock();
+    } catch (...) {
+        // A locker that is gone has logged that itself, as every failure; there is nothing left to release.
+    }
+}
+
+OSLockerLinux::OSLockerLinux() = default;
+OSLockerLinux::~OSLockerLinux() = default;
+
+int OSLockerLinux::Lock() {
+    return m_busy.exchange(true) ? busy : taken;
+}
+
+int OSLockerLinux::UnLock() {
+    m_busy.store(false);
+    return 0;
+}
+
+}  // namespace os

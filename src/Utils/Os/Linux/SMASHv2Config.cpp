@@ -1,0 +1,164 @@
+#include "Utils/Os/Linux/SMASHv2Config.h"
+
+#include <fstream>
+#include <locale>
+#include <sstream>
+#include <string_view>
+#include <utility>
+
+#include "Utils/Log.h"
+#include "Utils/Os/Linux/linux.h"
+#include "Utils/Utils.h"
+
+const char* const SMASHv2_BASE_REG_PATH = "SOFTWARE\\TARVEL\\Network_Services\\SMASHv2";
+const char* const SMASHv2_NAMESPACE_KEY = "Namespace";
+const char* const SMASHv2_DEFAUL_NAMESPACE = "root/cimv2";
+const char* const SMASHv2_SEMAPHORE_TIMEOUT_KEY = "Timeout";
+const char* const VANTEX_REG_PATH = "SOFTWARE\\TARVEL\\Network_Services\\RVC3";
+const char* const SMASHv2_CUSTOMIZATION_KEY = "OEMCustomizeable";
+const char* const SMASHv2_FWFILE_PATH_KEY = "FWFilePath";
+const std::int32_t m_OEMCustomizationValues[1] = {5};
+
+namespace utils {
+
+template class Singleton<SMASHv2Config>;
+template class AutoSingleton<SMASHv2Config>;
+
+namespace {
+
+constexpr const char* configurationFile = "/etc/quenx-cimprovider.conf";
+constexpr const char* releaseClaimKey = "ReleaseClaimAfterCheck";
+constexpr std::string_view rootNamespace = "root";
+// The lines of a reading pass name the operation as a whole.
+constexpr const char* readingFunction = "initialize";
+
+bool isSkipped(const std::string& line) {
+    const std::size_t begin = line.find_first_not_of(" \t");
+    return begin == std::string::npos || line[begin] == '#';
+}
+
+/// Appends the directories of a list separated by ';' that exist.
+void addDirectories(const std::string& list, StringArray& directories) {
+    for (const std::string& item : split(list, ';')) {
+        std::string path(trimOf(item, " "));
+        if (!path.empty() && path.back() == '/') path.pop_back();
+        if (!os::isThisADir(path)) continue;
+        formatDebugLog(__FILE__, readingFunction, __LINE__, "Adding path-> %s", path.c_str());
+        directories.push_back(std::move(path));
+    }
+}
+
+}  // namespace
+
+SMASHv2Config::SMASHv2Config(std::string path)
+    : m_path(std::move(path)), m_namespace(SMASHv2_DEFAUL_NAMESPACE) {}
+
+SMASHv2Config::~SMASHv2Config() = default;
+
+std::unique_ptr<SMASHv2Config> SMASHv2Config::CreateSingleton() {
+    return std::make_unique<SMASHv2Config>(configurationFile);
+}
+
+std::string SMASHv2Config::getNamespace() {
+    initialize();
+    Mutex::AutoLocker locker(m_mutex);
+    return m_namespace;
+}
+
+std::uint32_t SMASHv2Config::getLockerTimeout() {
+    initialize();
+    Mutex::AutoLocker locker(m_mutex);
+    return m_lockerTimeout;
+}
+
+bool SMASHv2Config::isDowngradeEnabled() {
+    initialize();
+    Mutex::AutoLocker locker(m_mutex);
+    for (const std::int32_t value : m_OEMCustomizationValues) {
+        if (m_oemCustomization == value) m_downgradeBlocked = true;
+    }
+    return !m_downgradeBlocked;
+}
+
+StringArray SMASHv2Config::getFirmwareFilesPaths() {
+    initialize();
+    Mutex::AutoLocker locker(m_mutex);
+    return m_firmwarePaths;
+}
+
+bool SMASHv2Config::getReleaseClaimAfterCheck() {
+    initialize();
+    Mutex::AutoLocker locker(m_mutex);
+    return m_releaseClaimAfterCheck;
+}
+
+void SMASHv2Config::initialize() {
+    Mutex::AutoLocker locker(m_mutex);
+    try {
+        StringArray directories;
+        std::ifstream file(m_path);
+        for (std::string line; std::getline(file, line);) {
+            if (!isSkipped(line)) readLine(std::move(line), directories);
+        }
+        m_firmwarePaths = std::move(directories);
+    } catch (...) {
+        QUENX_ERROR(" Reading configuration values from the config file - failed");
+    }
+}
+
+void SMASHv2Config::readLine(std::string line, StringArray& directories) {
+    // Intended: also in values.
+    replaceCharacter(line, '=', ' ');
+    std::istringstream words(line);
+    words.imbue(std::locale::classic());
+    std::string key;
+    words >> key;
+    if (key == SMASHv2_NAMESPACE_KEY) {
+        readNamespace(words);
+    } else if (key == SMASHv2_SEMAPHORE_TIMEOUT_KEY) {
+        readLockerTimeout(words);
+    } else if (key == SMASHv2_CUSTOMIZATION_KEY) {
+        readCustomization(words);
+    } else if (key == releaseClaimKey) {
+        readReleaseClaimAfterCheck(words);
+    } else if (key == SMASHv2_FWFILE_PATH_KEY) {
+        std::string list;
+        std::getline(words, list);
+        addDirectories(list, directories);
+    }
+}
+
+void SMASHv2Config::readNamespace(std::istream& words) {
+    std::string word;
+    words >> word;
+    if (word.compare(0, rootNamespace.size(), rootNamespace) != 0) return;
+    m_namespace = std::move(word);
+    formatDebugLog(__FILE__, readingFunction, __LINE__, "Read NameSpace : %s", m_namespace.c_str());
+}
+
+void SMASHv2Config::readLockerTimeout(std::istream& words) {
+    std::string word;
+    words >> word;
+    toUint(word, m_lockerTimeout);
+    // Also after a refusal, with the value that stands.
+    formatDebugLog(__FILE__, readingFunction, __LINE__, "Read LockerTimeout : %d",
+                   static_cast<std::int32_t>(m_lockerTimeout));
+}
+
+void SMASHv2Config::readCustomization(std::istream& words) {
+    std::uint16_t value = 0;
+    if (!(words >> value)) return;
+    m_oemCustomization = value;
+    formatDebugLog(__FILE__, readingFunction, __LINE__, "Read OEMCustomizeable : %d", value);
+}
+
+void SMASHv2Config::readReleaseClaimAfterCheck(std::istream& words) {
+    std::string word;
+    words >> word;
+    if (word != "0" && word != "1") return;
+    m_releaseClaimAfterCheck = word == "1";
+    formatDebugLog(__FILE__, readingFunction, __LINE__, "Read ReleaseClaimAfterCheck : %d",
+                   m_releaseClaimAfterCheck);
+}
+
+}  // namespace utils

@@ -1,0 +1,77 @@
+#pragma once
+
+#include <cstdint>
+#include <iosfwd>
+#include <memory>
+#include <string>
+
+#include "Utils/Export.h"
+#include "Utils/Os/Linux/Mutex.h"
+#include "Utils/Singleton.h"
+#include "Utils/StringArray.h"
+#include "Utils/ThreadAnnotations.h"
+
+/// The keys and defaults of the configuration, and the registry-style paths that platforms with a registry
+/// use.
+QUENX_EXPORT extern const char* const SMASHv2_BASE_REG_PATH;
+QUENX_EXPORT extern const char* const SMASHv2_NAMESPACE_KEY;
+QUENX_EXPORT extern const char* const SMASHv2_DEFAUL_NAMESPACE;  // the missing T is intended
+QUENX_EXPORT extern const char* const SMASHv2_SEMAPHORE_TIMEOUT_KEY;
+QUENX_EXPORT extern const char* const VANTEX_REG_PATH;
+QUENX_EXPORT extern const char* const SMASHv2_CUSTOMIZATION_KEY;
+QUENX_EXPORT extern const char* const SMASHv2_FWFILE_PATH_KEY;
+/// The OEM customisation values that forbid downgrades.
+QUENX_EXPORT extern const std::int32_t m_OEMCustomizationValues[1];
+
+namespace utils {
+
+/// The settings of /etc/quenx-cimprovider.conf. Every getter reads the file again, so an edited file takes
+/// effect at the next query. A setting that is missing or malformed keeps the value last read; the list of
+/// directories is built anew each time. Any thread may query; a file that cannot be read is no error.
+///
+/// `AutoSingleton<SMASHv2Config>::getInstance()` gives the current one. One constructed with another path is
+/// current while it lives.
+class QUENX_EXPORT SMASHv2Config : public AutoSingleton<SMASHv2Config> {
+  public:
+    /// Sets the defaults; does not read the file.
+    explicit SMASHv2Config(std::string path);
+
+    ~SMASHv2Config() override;
+    /// The CIM namespace, which begins with "root".
+    virtual std::string getNamespace();
+    virtual std::uint32_t getLockerTimeout();
+    /// False once the file has shown a customisation that forbids downgrades, for the life of this object.
+    virtual bool isDowngradeEnabled();
+    /// The directories of firmware files, each one existing, in file order.
+    virtual StringArray getFirmwareFilesPaths();
+    /// Reads the file. Never throws.
+    virtual void initialize();
+
+    /// True if a verify-only call gives back the adapter claim that it took (key ReleaseClaimAfterCheck, 0 or
+    /// 1).
+    bool getReleaseClaimAfterCheck();
+
+    static const char* GetSingletonName() { return "SMASHv2Config"; }
+    static std::unique_ptr<SMASHv2Config> CreateSingleton();
+
+  private:
+    void readLine(std::string line, StringArray& directories) QUENX_REQUIRES(m_mutex);
+    void readNamespace(std::istream& words) QUENX_REQUIRES(m_mutex);
+    void readLockerTimeout(std::istream& words) QUENX_REQUIRES(m_mutex);
+    void readCustomization(std::istream& words) QUENX_REQUIRES(m_mutex);
+    void readReleaseClaimAfterCheck(std::istream& words) QUENX_REQUIRES(m_mutex);
+
+    Mutex m_mutex;
+    std::uint16_t m_oemCustomization QUENX_GUARDED_BY(m_mutex) = 0;
+    const std::string m_path;
+    std::string m_namespace QUENX_GUARDED_BY(m_mutex);
+    std::uint32_t m_lockerTimeout QUENX_GUARDED_BY(m_mutex) = 300000;
+    bool m_downgradeBlocked QUENX_GUARDED_BY(m_mutex) = false;
+    StringArray m_firmwarePaths QUENX_GUARDED_BY(m_mutex);
+    bool m_releaseClaimAfterCheck QUENX_GUARDED_BY(m_mutex) = false;
+};
+
+extern template class Singleton<SMASHv2Config>;
+extern template class AutoSingleton<SMASHv2Config>;
+
+}  // namespace utils

@@ -1,0 +1,124 @@
+#include "Utils/Os/Linux/linux.h"
+
+#include <dirent.h>
+#include <fcntl.h>
+#include <limits.h>
+#include <net/if.h>
+#include <sys/stat.h>
+#include <sys/time.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <cerrno>
+#include <cstdlib>
+#include <memory>
+#include <string_view>
+
+#include "Utils/Exception.h"
+#include "Utils/Log.h"
+#include "Utils/Os/Linux/Descriptor.h"
+#include "Utils/Utils.h"
+
+namespace os {
+
+namespace {
+
+struct CloseDirectory {
+    void operator()(DIR* directory) const noexcept { closedir(directory); }
+};
+using Directory = std::unique_ptr<DIR, CloseDirectory>;
+
+/// A FIFO that took the file's place after the look at it must not block the opening.
+int openForReading(const std::string& path) noexcept {
+    return open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK | O_NOCTTY);
+}
+
+bool isReadableKind(const struct stat& status) noexcept {
+    return S_ISDIR(status.st_mode) || (S_ISREG(status.st_mode) && status.st_size <= INT32_MAX);
+}
+
+[[noreturn]] void failToOpen(const std::string& path) {
+    throw utils::Exception(utils::formatStr("Could not open the file %s", path.c_str()));
+}
+
+}  // namespace
+
+const char* getEnvVariable(const char* name) noexcept {
+    return std::getenv(name);
+}
+
+std::uint64_t getuSecondsSinceEpoch() noexcept {
+    timeval now{};
+    gettimeofday(&now, nullptr);
+    return static_cast<std::uint64_t>(now.tv_sec) * 1000000 + static_cast<std::uint64_t>(now.tv_usec);
+}
+
+std::string getHostname() {
+    char name[HOST_NAME_MAX + 1] = {};
+    if (gethostname(name, sizeof name - 1) != 0 || name[0] == '\0') return "localhost";
+    return name;
+}
+
+utils::StringArray getNetworkInterfaceNames() {
+    utils::StringArray names;
+    const std::unique_ptr<struct if_nameindex, decltype(&if_freenameindex)> list(if_nameindex(),
+                                                                                 &if_freenameindex);
+    if (list == nullptr) return names;
+    for (const struct if_nameindex* entry = list.get(); entry->if_name != nullptr; ++entry) {
+        names.emplace_back(entry->if_name);
+    }
+    return names;
+}
+
+std::int32_t getFileSize(const std::string& path) {
+    struct stat status {};
+    // A path with a NUL in it names nothing, and must not open what its head names.
+    if (path.find('\0') != std::string::npos) failToOpen(path);
+    if (stat(path.c_str(), &status) != 0 || !isReadableKind(status)) failToOpen(path);
+    const Descriptor file(openForReading(path));
+    // Intended: number 0 counts as a failure, too.
+    if (file.number() <= 0) failToOpen(path);
+    if (fstat(file.number(), &status) != 0) {
+        throw utils::Exception(utils::formatStr("Could not get info about the file %s", path.c_str()));
+    }
+    if (S_ISDIR(status.st_mode)) {
+        throw utils::Exception(utils::formatStr("The specyfied URI %s points to a directory", path.c_str()));
+    }
+    if (!isReadableKind(status)) failToOpen(path);
+    const auto size = static_cast<std::int32_t>(status.st_size);
+    QUENX_DEBUG("Output size of file: %d", size);
+    return size;
+}
+
+std::size_t readFile(const std::string& path, std::span<std::uint8_t> buffer) noexcept {
+    struct stat status {};
+    if (stat(path.c_str(), &status) != 0 || !S_ISREG(status.st_mode)) return 0;
+    const Descriptor file(openForReading(path));
+    if (file.number() < 0 || fstat(file.number(), &status) != 0 || !S_ISREG(status.st_mode)) return 0;
+    std::size_t count = 0;
+    while (count < buffer.size()) {
+        const ssize_t result = read(file.number(), buffer.data() + count, buffer.size() - count);
+        if (result < 0 && errno == EINTR) continue;
+        if (result <= 0) break;
+        count += static_cast<std::size_t>(result);
+    }
+    return count;
+}
+
+bool isThisADir(const std::string& path) noexcept {
+    return Directory(opendir(path.c_str())) != nullptr;
+}
+
+utils::StringArray listDirectory(const std::string& path) {
+    utils::StringArray names;
+    const Directory directory(opendir(path.c_str()));
+    if (directory == nullptr) return names;
+    while (const dirent* const entry = readdir(directory.get())) {
+        const std::string_view name = entry->d_name;
+        if (name != "." && name != "..") names.emplace_back(name);
+    }
+    std::sort(names.begin(), names.end());
+    return names;
+}
+
+}  // namespace os

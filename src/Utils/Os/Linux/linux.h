@@ -1,0 +1,43 @@
+#pragma once
+
+#include <cstddef>
+#include <cstdint>
+#include <span>
+#include <string>
+
+#include "Utils/Export.h"
+#include "Utils/StringArray.h"
+
+/// What this system asks the operating system for. Any thread may call.
+namespace os {
+
+/// The variable's value, null when it is not set. Owned by the environment.
+QUENX_EXPORT const char* getEnvVariable(const char* name) noexcept;
+
+/// The wall clock, microseconds since the Unix epoch.
+QUENX_EXPORT std::uint64_t getuSecondsSinceEpoch() noexcept;
+
+/// The host's name, "localhost" when it cannot be had.
+QUENX_EXPORT std::string getHostname();
+
+/// The names of the network interfaces, in the kernel's order; empty when they cannot be had.
+QUENX_EXPORT utils::StringArray getNetworkInterfaceNames();
+
+/// The size in bytes of a regular file.
+/// @throws utils::Exception "Could not open the file %s" for what does not exist, cannot be opened, has a NUL
+/// in its path, is larger than 2^31-1 bytes or is neither a file nor a directory, which is told before it is
+/// opened: a FIFO never blocks; "Could not get info about the file %s"; "The specyfied URI %s points to a
+/// directory" (the spelling is intended)
+QUENX_EXPORT std::int32_t getFileSize(const std::string& path);
+
+/// Fills the buffer from the beginning of a regular file. Returns the bytes read: fewer than asked for when
+/// the file is shorter, cannot be read on, or is none. Never blocks on a FIFO or a device, never throws.
+QUENX_EXPORT std::size_t readFile(const std::string& path, std::span<std::uint8_t> buffer) noexcept;
+
+/// True exactly when the path can be opened as a directory.
+QUENX_EXPORT bool isThisADir(const std::string& path) noexcept;
+
+/// The names in a directory without "." and "..", sorted; empty when it cannot be read.
+QUENX_EXPORT utils::StringArray listDirectory(const std::string& path);
+
+}  // namespace os

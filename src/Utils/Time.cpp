@@ -1,0 +1,129 @@
+#include "Utils/Time.h"
+
+#include <ctime>
+
+#include "Utils/Exception.h"
+#include "Utils/Os/Linux/linux.h"
+
+namespace utils {
+
+namespace {
+
+constexpr std::uint64_t microsecondsPerSecond = 1000000;
+
+int daysOfMonth(int year, int month) {
+    if (month == 2) return Time::isLeapYear(static_cast<unsigned short>(year)) ? 29 : 28;
+    return month == 4 || month == 6 || month == 9 || month == 11 ? 30 : 31;
+}
+
+}  // namespace
+
+Time::Time() {
+    resetTimer();
+}
+
+Time::Time(unsigned long long microseconds) : m_value(microseconds) {}
+
+Time Time::fromEpoch(unsigned long long microseconds) {
+    Time time(microseconds);
+    time.m_isTimestamp = true;
+    return time;
+}
+
+Time::Time(int year, int month, int day, int hour, int minute, int second) : m_isTimestamp(true) {
+    if (year < 1900) throw Exception("wrong year value %d", year);
+    if (month < 1 || month > 12) throw Exception("wrong month value %d", month);
+    if (day < 1 || day > daysOfMonth(year, month)) throw Exception("wrong day value %d", day);
+    if (hour < 0 || hour > 23) throw Exception("wrong hour value %d", hour);
+    if (minute < 0 || minute > 59) throw Exception("wrong minute value %d", minute);
+    if (second < 0 || second > 59) throw Exception("wrong second value %d", second);
+
+    std::tm fields{};
+    fields.tm_year = year - 1900;
+    fields.tm_mon = month - 1;
+    fields.tm_mday = day;
+    fields.tm_hour = hour;
+    fields.tm_min = minute;
+    fields.tm_sec = second;
+    // Not mktime and `timezone`: a zone whose offset has changed has another one for an old date.
+    const std::time_t seconds = timegm(&fields);
+    // Intended: the last second of 1969 cannot be told from a failure.
+    if (seconds == -1) throw Exception("wrong time value");
+    // Modulo 2^64 before 1970.
+    m_value = static_cast<std::uint64_t>(seconds) * microsecondsPerSecond;
+}
+
+void Time::resetTimer() {
+    m_value = os::getuSecondsSinceEpoch();
+    m_isTimestamp = true;
+}
+
+void Time::setInterval(const Time& start) {
+    QUENX_ASSERT_TEXT(start.m_isTimestamp, __FILE__, __LINE__, "dtStart.isTimestamp == true");
+    m_value = os::getuSecondsSinceEpoch() - start.m_value;
+    m_isTimestamp = false;
+}
+
+Time Time::setIntervalInSeconds(unsigned int seconds) {
+    m_value = seconds * microsecondsPerSecond;
+    m_isTimestamp = false;
+    return *this;
+}
+
+Time Time::setIntervalInMinutes(unsigned int minutes) {
+    return setIntervalInSeconds(minutes * 60U);
+}
+
+void Time::get(int& year, int& month, int& day, int& hour, int& minute, int& second) const {
+    if (m_isTimestamp) {
+        decodeToDate(year, month, day, hour, minute, second);
+        return;
+    }
+    year = 0;
+    month = 0;
+    decodeToPeriod(day, hour, minute, second);
+}
+
+void Time::decodeToDate(int& year, int& month, int& day, int& hour, int& minute, int& second) const {
+    QUENX_ASSERT_TEXT(m_isTimestamp, __FILE__, __LINE__, "this->isTimestamp");
+    const auto seconds = static_cast<std::time_t>(getSeconds());
+    std::tm fields{};
+    QUENX_ASSERT_TEXT(gmtime_r(&seconds, &fields) != nullptr, __FILE__, __LINE__, "ptm != __null");
+    year = fields.tm_year + 1900;
+    month = fields.tm_mon + 1;
+    day = fields.tm_mday;
+    hour = fields.tm_hour;
+    minute = fields.tm_min;
+    second = fields.tm_sec;
+}
+
+void Time::decodeToPeriod(int& days, int& hours, int& minutes, int& seconds) const {
+    QUENX_ASSERT(this->isPeriod());
+    const std::uint64_t total = getSeconds();
+    seconds = static_cast<int>(total % 60);
+    minutes = static_cast<int>(total / 60 % 60);
+    hours = static_cast<int>(total / 3600 % 24);
+    days = static_cast<int>(total / 86400);
+}
+
+bool Time::isLeapYear(unsigned short year) {
+    return (year % 4 == 0 && year % 100 != 0) || year % 400 == 0;
+}
+
+Time& Time::operator=(unsigned long long microseconds) {
+    m_value = microseconds;
+    m_isTimestamp = false;
+    return *this;
+}
+
+Time& Time::operator+=(unsigned long long microseconds) {
+    m_value += microseconds;
+    m_isTimestamp = false;
+    return *this;
+}
+
+Time Time::operator-(Time other) const {
+    return Time(m_value - other.m_value);
+}
+
+}  // namespace utils

@@ -1,0 +1,102 @@
+#include "Utils/Utils.h"
+
+#include <algorithm>
+#include <charconv>
+#include <cstdarg>
+#include <cstdio>
+#include <ctime>
+
+#include "Utils/Log.h"
+#include "Utils/VFormat.h"
+
+namespace utils {
+
+std::string vformatStr(const char* format, va_list arguments) {
+    constexpr std::size_t longest = 511;
+    char buffer[longest + 1] = {};
+    const int length = vsnprintf(buffer, sizeof buffer, format, arguments);
+    // Also for a negative result: the text is then the whole buffer, as log readers know it.
+    const bool isCut = static_cast<unsigned>(length) > longest;
+    return std::string(buffer, isCut ? longest : static_cast<std::size_t>(length));
+}
+
+std::string formatStr(const char* format, ...) {
+    va_list arguments;
+    va_start(arguments, format);
+    std::string text = vformatStr(format, arguments);
+    va_end(arguments);
+    return text;
+}
+
+std::string getCurrentTime() {
+    const std::time_t now = std::time(nullptr);
+    std::tm local{};
+    if (localtime_r(&now, &local) == nullptr) return "??:??:??";
+    return formatStr("%02d:%02d:%02d", local.tm_hour, local.tm_min, local.tm_sec);
+}
+
+StringArray split(std::string_view text, char separator) {
+    StringArray pieces;
+    for (;;) {
+        const std::size_t end = text.find(separator);
+        pieces.emplace_back(text.substr(0, end));
+        if (end == std::string_view::npos) return pieces;
+        text.remove_prefix(end + 1);
+    }
+}
+
+std::string_view trimOf(std::string_view text, std::string_view characters) {
+    const std::size_t begin = text.find_first_not_of(characters);
+    if (begin == std::string_view::npos) return {};
+    return text.substr(begin, text.find_last_not_of(characters) - begin + 1);
+}
+
+std::string trim(std::string_view text) {
+    return std::string(trimOf(text, " \t"));
+}
+
+bool toUint(std::string_view text, std::uint32_t& value) {
+    text = trimOf(text, " ");
+    const bool isHex = text.size() > 2 && text[0] == '0' && (text[1] == 'x' || text[1] == 'X');
+    if (isHex) text.remove_prefix(2);
+    // Without its prefix a number consists of digits only, so it prints back the same unless it is a decimal
+    // one that has leading zeros or does not fit a signed int.
+    std::uint32_t number = 0;
+    const char* const end = text.data() + text.size();
+    const auto [rest, error] = std::from_chars(text.data(), end, number, isHex ? 16 : 10);
+    if (error != std::errc() || rest != end) return false;
+    if (!isHex && (number > INT32_MAX || (text.size() > 1 && text[0] == '0'))) return false;
+    value = number;
+    return true;
+}
+
+void replaceCharacter(std::string& text, char from, char to) {
+    std::replace(text.begin(), text.end(), from, to);
+}
+
+std::string formatPCIAddr(const PCIAddr& address) {
+    if (address.noFunction) return formatStr("%02x:%02x", address.bus, address.device);
+    return formatStr("%02x:%02x.%x", address.bus, address.device, address.function);
+}
+
+}  // namespace utils
+
+std::string fmt(const char* format, ...) {
+    va_list arguments;
+    va_start(arguments, format);
+    std::string text = utils::vformatStr(format, arguments);
+    va_end(arguments);
+    return text;
+}
+
+void vpddbg(const char* format, ...) noexcept {
+    va_list arguments;
+    va_start(arguments, format);
+    try {
+        std::string text = utils::vformatStr(format, arguments);
+        std::erase(text, '\n');
+        utils::writeDebugLog(__FILE__, "vpddbg", __LINE__, std::move(text));
+    } catch (...) {
+    }
+    va_end(arguments);
+}

@@ -1,0 +1,44 @@
+#pragma once
+
+#include <cstdint>
+#include <string>
+#include <string_view>
+
+#include "Utils/Export.h"
+#include "Utils/FirmwareTypes.h"
+#include "Utils/StringArray.h"
+
+/// Formatting and small helpers for texts, numbers and addresses. All are reentrant; all may throw
+/// std::bad_alloc and nothing else.
+namespace utils {
+
+/// The expansion of a printf format, cut at 511 characters.
+QUENX_EXPORT std::string formatStr(const char* format, ...) __attribute__((format(printf, 1, 2)));
+
+/// The local wall-clock time as "hh:mm:ss", "??:??:??" when it cannot be had.
+QUENX_EXPORT std::string getCurrentTime();
+
+/// The pieces of `text` between its separators: one more than there are separators, empty ones included.
+QUENX_EXPORT StringArray split(std::string_view text, char separator);
+
+/// `text` without blanks and tabs at its ends.
+QUENX_EXPORT std::string trim(std::string_view text);
+
+/// `text` without any of `characters` at its ends.
+QUENX_EXPORT std::string_view trimOf(std::string_view text, std::string_view characters);
+
+/// Reads a decimal number below 2^31, or a hexadecimal one of 32 bits with the prefix "0x" in either letter
+/// case; blanks around it are ignored. A text that the number would not print back as is refused: a sign,
+/// leading zeros of a decimal number, anything after it. False, and `value` untouched, when refused.
+QUENX_EXPORT bool toUint(std::string_view text, std::uint32_t& value);
+
+/// Replaces every `from` by `to`, in place.
+QUENX_EXPORT void replaceCharacter(std::string& text, char from, char to);
+
+/// "bb:dd.f" in lower-case hexadecimal digits, "bb:dd" for an address without function.
+QUENX_EXPORT std::string formatPCIAddr(const PCIAddr& address);
+
+}  // namespace utils
+
+/// A second name of utils::formatStr.
+QUENX_EXPORT std::string fmt(const char* format, ...) __attribute__((format(printf, 1, 2)));

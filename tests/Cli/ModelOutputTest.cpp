@@ -1,0 +1,135 @@
+#include <gtest/gtest.h>
+
+#include <filesystem>
+#include <nlohmann/json.hpp>
+
+#include "Cli/Failure.h"
+#include "Cli/FakeManagement.h"
+#include "Cli/ImageUri.h"
+#include "Cli/Json.h"
+#include "Cli/Mof.h"
+#include "Cli/Values.h"
+#include "Cli/Verbs.h"
+
+namespace {
+
+using core::CimScalar;
+using core::CimType;
+using core::CimValue;
+
+TEST(ImageUri, PathsBecomeUrisAndNothingIsEncoded) {
+    const std::string here = std::filesystem::current_path().string();
+    const struct {
+        const char* image;
+        std::string uri;
+    } rows[] = {
+        {"/a b%20c:d::e", "file:///a b%20c:d::e"},
+        {"x.rom", "file://" + here + "/x.rom"},
+        {"a:b.rom", "file://" + here + "/a:b.rom"},
+        {"FILE:///x", "FILE:///x"},
+        {"file:/x", "file:/x"},
+        {"http://host/x", "http://host/x"},
+        {"://x", "file://" + here + "/://x"},
+    };
+    for (const auto& row : rows)
+        EXPECT_EQ(cli::imageUri(row.image), row.uri);
+    EXPECT_EQ(cli::localPath("FILE:///a::b"), "/a::b");
+    EXPECT_FALSE(cli::localPath("http://host/x"));
+    EXPECT_FALSE(cli::localPath("file:/x"));
+}
+
+TEST(ModelOutput, ValuesAsTextAndAsJson) {
+    const struct {
+        CimValue value;
+        std::string text;
+        std::string json;
+    } rows[] = {
+        {CimValue::null(CimType::String), "NULL", "null"},
+        {CimValue::of(CimType::Boolean, true), "TRUE", "true"},
+        {CimValue::of(CimType::Uint64, std::uint64_t{18446744073709551615U}), "18446744073709551615",
+         "18446744073709551615"},
+        {CimValue::of(CimType::Sint8, std::int64_t{-5}), "-5", "-5"},
+        {CimValue::of(CimType::String, std::string("a\"\\\n")), "\"a\\\"\\\\\\x0a\"", "\"a\\\"\\\\\\n\""},
+        {CimValue::arrayOf(CimType::Uint16, {std::uint64_t{5}, std::uint64_t{3}}), "{5, 3}", "[5,3]"},
+        {CimValue::arrayOf(CimType::String, {}), "{}", "[]"},
+        {CimValue::of(CimType::Datetime, utils::Time()), "", ""},
+    };
+    for (const auto& row : rows) {
+        if (row.value.type == CimType::Datetime) {
+            EXPECT_EQ(cli::displayText(row.value).size(), 25U);
+            EXPECT_EQ(cli::toJson(row.value).get<std::string>().size(), 25U);
+            continue;
+        }
+        EXPECT_EQ(cli::displayText(row.value), row.text);
+        EXPECT_EQ(cli::toJson(row.value).dump(), row.json);
+    }
+}
+
+TEST(ModelOutput, BytesThatAreNoTextDoNotSpoilTheDocument) {
+    std::ostringstream out;
+    cli::printJson(out, {{"name", "a\xff"}});
+    EXPECT_EQ(nlohmann::json::parse(out.str())["name"], "a\xEF\xBF\xBD");
+}
+
+TEST(ModelOutput, InstancesAndNames) {
+    test::VerbRun run;
+    test::fillModel(run.model, 1, 0);
+    cli::showInstances(run.context, {"Quenx_SoftwareInstallationService", true});
+    EXPECT_EQ(run.out.str(), "Quenx_SoftwareInstallationService.Name=\"Quenx:FirmwareUpdate\"\n");
+    run.out.str("");
+    run.context.json = true;
+    cli::showInstances(run.context, {"Quenx_EthernetPort", false});
+    const auto document = nlohmann::json::parse(run.out.str());
+    EXPECT_EQ(document["instances"][1]["properties"]["Name"], "eth3");
+    EXPECT_EQ(document["instances"][1]["class"], "Quenx_EthernetPort");
+    EXPECT_THROW(cli::showAssociators(run.context, {"no path", {}, false}), cli::Failure);
+}
+
+TEST(ModelOutput, AdaptersAsATable) {
+    test::VerbRun run;
+    test::fillModel(run.model, 1, 0);
+    EXPECT_EQ(cli::showAdapters(run.context), cli::ExitStatus::Done);
+    EXPECT_EQ(run.out.str(),
+              "NAME  PCI      IDS        UPDATABLE  FIRMWARE               DESCRIPTION\n"
+              "eth0  03:00.0  1af4:1041  yes        IMG_PXE 1, IMG_UEFI 0  \n"
+              "eth3  05:00.0  1022:2000  no         -                      \n");
+}
+
+TEST(Mof, SuperclassesComeFirst) {
+    core::ClassDeclaration root{"CIM_Dependency", "", true, {}, {}};
+    root.properties = {{"Antecedent", CimType::Reference, false, true, "CIM_ManagedElement"}};
+    core::ClassDeclaration leaf{"A_Leaf", "CIM_Dependency", true, {}, {}};
+    leaf.properties = {{"Values", CimType::Uint16, true, false, ""}};
+    leaf.methods = {{"Run",
+                     CimType::Uint32,
+                     {{"Job", CimType::Reference, false, core::CimDirection::Out, false, "X"},
+                      {"In", CimType::String, false, core::CimDirection::In, false, ""}}}};
+    EXPECT_EQ(cli::mofText({leaf, root}),
+              "[ Association,\n"
+              "   Description ( \"One element depends on another.\" ) ]\n"
+              "class CIM_Dependency {\n"
+              "    [ Key ]\n"
+              "    CIM_ManagedElement REF Antecedent;\n"
+              "};\n\n"
+              "[ Association ]\n"
+              "class A_Leaf : CIM_Dependency {\n"
+              "    uint16 Values[];\n"
+              "    uint32 Run(\n"
+              "        [ In ( false ), Out ]\n"
+              "        X REF Job,\n"
+              "        [ In ]\n"
+              "        string In);\n"
+              "};\n");
+}
+
+TEST(Mof, ValuesAreTakenApart) {
+    core::ClassDeclaration job{"CIM_Job", "", false, {}, {}};
+    job.properties = {{"LocalOrUtcTime", CimType::Uint16, false, false, ""}};
+    const std::string text = cli::mofText({job});
+    EXPECT_NE(text.find("ValueMap { \"1\", \"2\" },\n       Values { \"Local Time\", \"UTC Time\" } ]\n"
+                        "    uint16 LocalOrUtcTime;\n"),
+              std::string::npos)
+        << text;
+}
+
+}  // namespace

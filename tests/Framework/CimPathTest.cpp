@@ -1,0 +1,89 @@
+#include "Framework/CimPath.h"
+
+#include <gtest/gtest.h>
+
+#include "Support/TestModel.h"
+
+namespace {
+
+using core::CimPath;
+
+TEST(CimPath, TextSurvivesReadingAndWriting) {
+    for (const char* text : {
+             "Quenx_Thing",
+             "root/cimv2:Quenx_Thing",
+             "Quenx_Thing.Name=\"a\"",
+             "root/cimv2:Quenx_Thing.Name=\"a:b.c,d=e\",Number=5,Flag=TRUE,Low=-7",
+             "//host/root/cimv2:Quenx_Thing.Name=\"with \\\"quotes\\\" and \\\\ backslash\"",
+             "Link.From=\"root/cimv2:Thing.Name=\\\"x\\\"\",To=\"Thing.Name=\\\"y\\\"\"",
+         }) {
+        const CimPath path{std::string(text)};
+        EXPECT_TRUE(path.isValid()) << text;
+        EXPECT_EQ(path.toString(), text);
+    }
+}
+
+TEST(CimPath, WhatDoesNotParseNamesNothingAndKeepsItsText) {
+    for (const std::string& text :
+         {std::string(), std::string("."), std::string("1Class"), std::string("Class."),
+          std::string("Class.Key"), std::string("Class.Key="), std::string("Class.Key=\"open"),
+          std::string("Class.Key=\"end\\"), std::string("Class.Key=\"a\"x"), std::string("Class.Key=\"a\","),
+          std::string("Class.A=1,a=2"), std::string("//host"), std::string("Class.Key=word"),
+          std::string("a b:c d.e=\"f\""), std::string("Class.K=\"a\0b\"\0", 15)}) {
+        const CimPath path(text);
+        EXPECT_FALSE(path.isValid()) << text;
+        EXPECT_EQ(path.toString(), text);
+        EXPECT_FALSE(path.names(path)) << text;
+    }
+}
+
+TEST(CimPath, ComparesNamesWithoutCaseAndValuesByType) {
+    struct Row {
+        const char* left;
+        const char* right;
+        bool same;
+    };
+    for (const Row& row : {
+             Row{"root/cimv2:Thing.Name=\"a\",No=5", "ROOT/CIMV2:THING.no=5,NAME=\"a\"", true},
+             Row{"Thing.Name=\"a\"", "Thing.Name=\"A\"", false},
+             Row{"Thing.No=5", "Thing.No=\"5\"", false},
+             Row{"Thing.No=5", "Thing.No=0x5", true},
+             Row{"Thing.No=5", "Thing.No=5,More=1", false},
+             Row{"Thing.Name=\"a\"", "root/x:Thing.Name=\"a\"", true},
+             Row{"root/y:Thing.Name=\"a\"", "root/x:Thing.Name=\"a\"", false},
+             Row{"//h/root/x:Thing.Name=\"a\"", "//other/root/x:Thing.Name=\"a\"", true},
+             Row{"Thing.Flag=true", "Thing.Flag=TRUE", true},
+         }) {
+        const CimPath left{std::string(row.left)};
+        const CimPath right{std::string(row.right)};
+        EXPECT_EQ(left.names(right), row.same) << row.left << " / " << row.right;
+        EXPECT_EQ(right.names(left), row.same) << row.left << " / " << row.right;
+    }
+    // A reference as a value, and the same as the quoted text that a path holds.
+    const CimPath value("Link", {{"From", core::CimScalar(CimPath(std::string("Thing.Name=\"x\"")))}});
+    EXPECT_TRUE(value.names(CimPath(std::string("LINK.from=\"root/x:thing.NAME=\\\"x\\\"\""))));
+    EXPECT_FALSE(value.names(CimPath(std::string("Link.From=\"Thing.Name=\\\"y\\\"\""))));
+    EXPECT_EQ(value.toString(), "Link.From=\"Thing.Name=\\\"x\\\"\"");
+}
+
+TEST(CimPath, NamesTheInstanceThatItWasTakenFrom) {
+    const test::Gadget one("quote\" and \\", 1);
+    const test::Gadget other("quote\" and \\", 2);
+    const CimPath path = CimPath::of(one);
+    EXPECT_EQ(path.toString(), "Test_Gadget.ID=\"quote\\\" and \\\\\",Number=1");
+    EXPECT_TRUE(CimPath(path.toString()).names(one));
+    EXPECT_FALSE(path.names(other));
+
+    const test::Link link(one, other);
+    EXPECT_TRUE(CimPath(CimPath::of(link).toString()).names(link));
+}
+
+TEST(CimPath, RealKeysAreReadBackAsReals) {
+    for (const char* text : {"A.X=1.5e3", "A.X=-0.25", "A.X=1e300", "A.X=0.0"}) {
+        const core::CimPath path{std::string(text)};
+        EXPECT_TRUE(core::CimPath(path.toString()).names(path)) << path.toString();
+    }
+    EXPECT_EQ(core::CimPath(std::string("A.X=1.5e3,Y=1e300")).toString(), "A.X=1500.0,Y=1.0e+300");
+}
+
+}  // namespace

@@ -1,0 +1,110 @@
+#include <gtest/gtest.h>
+
+#include <thread>
+
+#include "Framework/CimError.h"
+#include "Support/TestModel.h"
+
+namespace {
+
+TEST(CimProperty, StartsNullAndAssignmentEndsIt) {
+    test::Gadget gadget;
+    for (const core::CimProperty* property : gadget.getAllProperties())
+        EXPECT_TRUE(property->IsNull());
+    EXPECT_EQ(core::datetimeText(gadget.Made.get()), "00000000000000.000000:000");
+
+    gadget.Codes.push_back(7);
+    gadget.Codes.setNull();
+    gadget.Codes.push_back(2);
+    EXPECT_EQ(gadget.Codes.get(), std::vector<unsigned short>{2});
+    gadget.Codes.clear();
+    EXPECT_FALSE(gadget.Codes.IsNull());
+
+    gadget.Caption = "text";
+    gadget.ID = gadget.Caption;
+    EXPECT_EQ(gadget.ID.get(), "text");
+    gadget.Caption.setNull();
+    gadget.ID = gadget.Caption;
+    EXPECT_TRUE(gadget.ID.IsNull());
+}
+
+TEST(CimProperty, TheMostDerivedOfANameIsServed) {
+    test::Gadget gadget("x");
+    EXPECT_EQ(gadget.getPropertyByName("id"), &gadget.ID);
+    EXPECT_TRUE(static_cast<test::Thing&>(gadget).ID.IsNull());
+    std::vector<std::string> names;
+    for (const core::CimProperty* property : gadget.getProperties())
+        names.emplace_back(property->getName());
+    EXPECT_EQ(names, (std::vector<std::string>{"ID", "Number", "Caption", "Codes", "Made"}));
+    EXPECT_EQ(gadget.getAllProperties().size(), 8U);
+}
+
+TEST(CimProperty, ModificationChecksEverythingFirst) {
+    test::Gadget gadget("x");
+    gadget.Caption.setLengthBounds(2, 5);
+    const auto modify = [&](const char* name, core::CimValue value) {
+        core::CimPropertyList requested;
+        requested.add("Codes", core::CimValue::arrayOf(core::CimType::Uint16, {std::uint64_t{9}}));
+        requested.add(name, value);
+        return gadget.modifyInstance(requested);
+    };
+    const auto text = [](const char* value) {
+        return core::CimValue::of(core::CimType::String, std::string(value));
+    };
+
+    EXPECT_THROW(modify("Caption", text("too long")), core::CimError);
+    EXPECT_THROW(modify("Caption", text("x")), core::CimError);
+    EXPECT_THROW(modify("ID", text("key")), core::CimError);
+    EXPECT_THROW(modify("Nothing", text("there")), core::CimError);
+    EXPECT_THROW(modify("Made", text("no time")), core::CimError);
+    EXPECT_TRUE(gadget.Codes.IsNull());
+    EXPECT_EQ(gadget.Caption.get(), "Gadget x");
+
+    EXPECT_EQ(modify("caption", text("fits")), 0U);
+    EXPECT_EQ(gadget.Caption.get(), "fits");
+    EXPECT_EQ(gadget.Codes.get(), std::vector<unsigned short>{9});
+}
+
+TEST(CimProperty, AValueOfAnotherTypeIsRefused) {
+    test::Gadget gadget("x", 3);
+    EXPECT_THROW(gadget.Number.setValue(core::CimValue::of(core::CimType::String, std::string("3"))),
+                 core::CimError);
+    EXPECT_THROW(
+        gadget.Codes.setValue(core::CimValue::arrayOf(core::CimType::Uint32, {std::uint64_t{65536}})),
+        core::CimError);
+    EXPECT_EQ(gadget.Number.get(), 3U);
+}
+
+TEST(CimProperty, AReferenceOutlivesItsTarget) {
+    core::InstanceList list;
+    auto* target = new test::Gadget("t");
+    list.add(target);
+    test::Link link(*target, *target);
+    EXPECT_EQ(link.From.getInstance().get(), target);
+    list.clear();
+    EXPECT_EQ(link.From.getInstance(), nullptr);
+    EXPECT_EQ(link.From.toString(), "Test_Gadget.ID=\"t\",Number=0");
+    EXPECT_EQ(link.From.getValue().type, core::CimType::Reference);
+}
+
+TEST(CimProperty, ARefreshIsSeenWholeOrNotAtAll) {
+    test::Gadget gadget;
+    std::thread writer([&] {
+        for (unsigned short i = 0; i < 2000; ++i) {
+            const core::RecursiveLocker lock(gadget.getMutex());
+            gadget.Codes = std::vector<unsigned short>(3, i);
+            gadget.Number = i;
+        }
+    });
+    for (int i = 0; i < 2000; ++i) {
+        const core::RecursiveLocker lock(gadget.getMutex());
+        const auto codes = gadget.Codes.get();
+        if (!codes.empty()) {
+            ASSERT_EQ(codes,
+                      std::vector<unsigned short>(3, static_cast<unsigned short>(gadget.Number.get())));
+        }
+    }
+    writer.join();
+}
+
+}  // namespace

@@ -1,0 +1,39 @@
+#include <string>
+#include <string_view>
+
+#include "Fuzz/Quiet.h"
+#include "Fuzz/Require.h"
+#include "MidAPI/AdapterError.h"
+#include "MidAPI/Simulator/Simulator.h"
+
+namespace {
+
+/// What is taken must be usable: every adapter answers. Descriptions that name files are not followed.
+void useAdapters(std::vector<ma::AdapterDescription> adapters) {
+    for (ma::AdapterDescription& adapter : adapters) {
+        adapter.flashFile.clear();
+        adapter.faults.clear();
+    }
+    ma::Simulator simulator(std::move(adapters), "/nonexistent");
+    for (const std::string& name : simulator.enumerateAdapters()) {
+        require(!name.empty() && simulator.getPCIAddress(name).text.size() >= 10);
+        require(simulator.getAdapterInfo(name).components.size() <= 5);
+    }
+}
+
+}  // namespace
+
+extern "C" int LLVMFuzzerInitialize(int*, char***) {
+    beQuiet();
+    return 0;
+}
+
+extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
+    const std::string text(data, data + size);
+    try {
+        useAdapters(ma::parseAdapterDescriptions(text, "fuzz.toml"));
+    } catch (const ma::AdapterError& error) {
+        require(std::string_view(error.what()).starts_with("fuzz.toml, line "));
+    }
+    return 0;
+}

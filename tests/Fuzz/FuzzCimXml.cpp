@@ -1,0 +1,48 @@
+#include <string>
+
+#include "Fuzz/Require.h"
+#include "Host/CimXml/RequestReader.h"
+#include "Host/CimXml/RequestWriter.h"
+#include "Host/CimXml/ResponseReader.h"
+#include "Host/CimXml/ResponseWriter.h"
+#include "Host/CimXml/WireError.h"
+#include "Host/CimXml/XmlGuard.h"
+
+namespace {
+
+/// A request that can be read can be written, and reads back as what was written.
+void checkRequest(std::string_view bytes) {
+    cimxml::Request request;
+    try {
+        request = cimxml::readRequest(bytes);
+    } catch (const cimxml::WireError&) {
+        return;
+    }
+    const std::string once = cimxml::writeRequest(request);
+    require(cimxml::writeRequest(cimxml::readRequest(once)) == once);
+}
+
+void checkResponse(std::string_view bytes) {
+    try {
+        const cimxml::Response response = cimxml::readResponse(bytes);
+        cimxml::checkWellFormed(cimxml::writeResponse(response));
+    } catch (const cimxml::WireError&) {
+    }
+}
+
+/// Whatever a provider says, the answer is well-formed.
+void checkText(const std::string& text) {
+    const cimxml::Response response{text, text, true, text, cimxml::Failure{core::CimStatus::Failed, text}};
+    cimxml::readResponse(cimxml::writeResponse(response));
+}
+
+}  // namespace
+
+extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
+    // A block of its own: reading past its end is seen.
+    const std::string bytes(reinterpret_cast<const char*>(data), size);
+    checkRequest(bytes);
+    checkResponse(bytes);
+    checkText(bytes);
+    return 0;
+}

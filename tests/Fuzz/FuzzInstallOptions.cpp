@@ -1,0 +1,49 @@
+#include <string>
+
+#include "Fuzz/Quiet.h"
+#include "Fuzz/Require.h"
+#include "Providers/SoftwareUpdate/Quenx_ConcreteJob.h"
+#include "Providers/SoftwareUpdate/UpdateExceptions.h"
+#include "Utils/Utils.h"
+
+namespace {
+
+/// The first line has the options, a character each; the others are the values.
+struct Input {
+    explicit Input(const std::string& text) {
+        utils::StringArray lines = utils::split(text, '\n');
+        for (const char c : lines.front())
+            options.push_back(c == 'T' ? 32768 : static_cast<unsigned short>(c - '0'));
+        values.assign(lines.begin() + 1, lines.end());
+    }
+
+    std::vector<unsigned short> options;
+    std::vector<std::string> values;
+};
+
+}  // namespace
+
+extern "C" int LLVMFuzzerInitialize(int*, char***) {
+    beQuiet();
+    return 0;
+}
+
+extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
+    Input input(std::string(data, data + size));
+    const Input before = input;
+    Quenx_ConcreteJob::m_servicedAdapter = std::string("eth0");
+    try {
+        std::size_t types = 0;
+        for (const utils::FirmwareType type :
+             Quenx_ConcreteJob::getTargetTypes(input.options, input.values)) {
+            require(type >= utils::FirmwareType::None && type <= utils::FirmwareType::FCoE);
+            ++types;
+        }
+        require(types <= size + 1);
+        require(Quenx_ConcreteJob::m_servicedAdapter == std::string("eth0"));
+    } catch (const utils::EInvalidParameter&) {
+        require(Quenx_ConcreteJob::m_servicedAdapter == std::string());
+    }
+    require(input.options == before.options && input.values == before.values);
+    return 0;
+}

@@ -1,0 +1,315 @@
+#include "Host/Operations/Dispatcher.h"
+
+#include <gtest/gtest.h>
+
+#include "Host/CimXml/ResponseWriter.h"
+#include "Host/Operations/ProviderNamespace.h"
+#include "Host/WireCheck.h"
+#include "Support/TestModel.h"
+
+namespace {
+
+using cimxml::ClassName;
+using cimxml::IntrinsicResult;
+using cimxml::ParameterValue;
+using core::CimPath;
+using core::CimStatus;
+
+using Given = std::vector<cimxml::Parameter>;
+
+/// A path as a message holds it: keys are texts.
+CimPath rawPath(const std::string& className, std::vector<core::CimKey> keys) {
+    return {className, std::move(keys)};
+}
+
+CimPath gadget(const std::string& id, const std::string& number) {
+    return rawPath("test_gadget", {{"number", number}, {"id", id}});
+}
+
+class DispatcherTest : public ::testing::Test {
+  protected:
+    DispatcherTest()
+        : m_dispatcher({std::make_shared<host::ProviderNamespace>("root/cimv2")},
+                       {2, std::chrono::seconds(60), std::chrono::seconds(100)}) {
+        auto* a = m_agent.add("a", 1);
+        auto* b = m_agent.add("b", 2);
+        m_agent.add("c", 3);
+        m_agent.links().instances.add(new test::Link(*a, *b));
+    }
+
+    cimxml::Response answer(std::variant<cimxml::IntrinsicCall, cimxml::MethodCall> call,
+                            const host::Caller& caller) {
+        const cimxml::Response response = m_dispatcher.dispatch({"1", std::move(call)}, caller);
+        EXPECT_EQ(test::faultsOf(cimxml::writeResponse(response)), "");
+        return response;
+    }
+
+    cimxml::Response send(const std::string& operation, Given parameters) {
+        return answer(cimxml::IntrinsicCall{operation, m_namespace, std::move(parameters)}, m_caller);
+    }
+
+    IntrinsicResult call(const std::string& operation, Given parameters) {
+        const cimxml::Response response = send(operation, std::move(parameters));
+        if (const auto* failure = std::get_if<cimxml::Failure>(&response.content)) {
+            ADD_FAILURE() << operation << ": " << failure->description;
+            return {};
+        }
+        return std::get<IntrinsicResult>(response.content);
+    }
+
+    static int statusIn(const cimxml::Response& response) {
+        const auto* failure = std::get_if<cimxml::Failure>(&response.content);
+        if (failure == nullptr) return 0;
+        EXPECT_NE(failure->description, "");
+        return static_cast<int>(failure->status);
+    }
+
+    int status(const std::string& operation, Given parameters) {
+        return statusIn(send(operation, std::move(parameters)));
+    }
+
+    cimxml::Response invoke(const CimPath& object, const std::string& method,
+                            std::vector<cimxml::RawArgument> arguments, bool isClass = false) {
+        CimPath placed = object;
+        placed.setNamespace(m_namespace);
+        return answer(cimxml::MethodCall{method, placed, isClass, std::move(arguments)}, m_caller);
+    }
+
+    static std::string output(const IntrinsicResult& result, const std::string& name) {
+        for (const core::Argument& each : result.outputs) {
+            if (each.name == name) return core::scalarText(each.value.type, *each.value.scalar());
+        }
+        return "none";
+    }
+
+    std::string m_namespace = "root/cimv2";
+    host::Caller m_caller{"admin", true, "localhost"};
+    test::GadgetAgent m_agent;
+    host::Dispatcher m_dispatcher;
+};
+
+TEST_F(DispatcherTest, ReadsInstances) {
+    for (const char* name : {"Test_Thing", "TEST_GADGET"}) {
+        EXPECT_EQ(call("enumerateinstances", {{"classname", ClassName{name}}}).instances.size(), 3U);
+        EXPECT_EQ(call("EnumerateInstanceNames", {{"ClassName", ClassName{name}}}).paths.size(), 3U);
+    }
+    const auto whole = call("GetInstance", {{"InstanceName", gadget("b", " 0x2 ")},
+                                            {"IncludeClassOrigin", "true"},
+                                            {"LocalOnly", ParameterValue()}});
+    ASSERT_EQ(whole.instances.size(), 1U);
+    EXPECT_EQ(whole.instances[0].properties.size(), 5U);
+    EXPECT_EQ(whole.origins->at("test_gadget").at("caption"), "Test_Thing");
+    EXPECT_EQ(whole.origins->at("test_gadget").at("made"), "Test_Gadget");
+
+    const auto shallow =
+        call("EnumerateInstances", {{"ClassName", ClassName{"Test_Thing"}},
+                                    {"DeepInheritance", "FALSE"},
+                                    {"PropertyList", std::vector<std::string>{"MADE", "id"}}});
+    ASSERT_EQ(shallow.instances.at(0).properties.size(), 1U);
+    EXPECT_EQ(shallow.instances[0].properties[0].name, "ID");
+    const auto none = call(
+        "GetInstance", {{"InstanceName", gadget("b", "2")}, {"PropertyList", std::vector<std::string>()}});
+    EXPECT_TRUE(none.instances.at(0).properties.empty());
+    EXPECT_EQ(none.instances[0].path.getKeys().size(), 2U);
+}
+
+TEST_F(DispatcherTest, AnswersEachMistakeByItsStatus) {
+    const ClassName unknown{"Unknown"};
+    const ClassName known{"Test_Gadget"};
+    const CimPath a = gadget("a", "1");
+    const struct {
+        int status;
+        const char* operation;
+        Given parameters;
+    } table[] = {
+        {4, "GetInstance", {}},
+        {4, "GetInstance", {{"InstanceName", ParameterValue()}}},
+        {4, "GetInstance", {{"InstanceName", known}}},
+        {4, "GetInstance", {{"InstanceName", a}, {"instancename", a}}},
+        {4, "GetInstance", {{"InstanceName", a}, {"Unknown", "x"}}},
+        {4, "GetInstance", {{"InstanceName", a}, {"LocalOnly", "maybe"}}},
+        {5, "GetInstance", {{"InstanceName", rawPath("Unknown", {{"ID", std::string("a")}})}}},
+        {4, "GetInstance", {{"InstanceName", rawPath("Test_Gadget", {})}}},
+        {4, "GetInstance", {{"InstanceName", rawPath("Test_Gadget", {{"ID", std::string("a")}})}}},
+        {4, "GetInstance", {{"InstanceName", gadget("a", "many")}}},
+        {6, "GetInstance", {{"InstanceName", gadget("a", "2")}}},
+        {5, "EnumerateInstances", {{"ClassName", unknown}}},
+        {5, "EnumerateInstanceNames", {{"ClassName", unknown}}},
+        {6, "GetClass", {{"ClassName", unknown}}},
+        {5, "EnumerateClasses", {{"ClassName", unknown}}},
+        {5, "EnumerateClassNames", {{"ClassName", unknown}}},
+        {6, "DeleteInstance", {{"InstanceName", gadget("a", "2")}}},
+        {7,
+         "DeleteInstance",
+         {{"InstanceName", rawPath("Test_Link", {{"From", gadget("a", "1")}, {"To", gadget("b", "2")}})}}},
+        {7, "CreateInstance", {{"NewInstance", cimxml::InstanceBody{"Test_Gadget", {}}}}},
+        {5, "CreateInstance", {{"NewInstance", cimxml::InstanceBody{"Unknown", {}}}}},
+        {7, "ModifyInstance", {{"ModifiedInstance", cimxml::InstanceBody{"Test_Gadget", a}}}},
+        {6, "ModifyInstance", {{"ModifiedInstance", cimxml::InstanceBody{"Test_Gadget", gadget("x", "1")}}}},
+        {7, "Associators", {{"ObjectName", known}}},
+        {4, "Associators", {{"ObjectName", a}, {"AssocClass", unknown}}},
+        {4, "References", {{"ObjectName", a}, {"ResultClass", unknown}}},
+        {6, "GetQualifier", {{"QualifierName", "Unknown"}}},
+        {14, "ExecQuery", {{"QueryLanguage", "WQL"}, {"Query", "SELECT"}}},
+        {7, "OpenQueryInstances", {{"FilterQuery", "SELECT"}}},
+        {7, "SetProperty", {{"PropertyName", "x"}}},
+        {7, "Nonsense", {}},
+        {25, "OpenEnumerateInstances", {{"ClassName", known}, {"FilterQuery", "x"}}},
+        {26, "OpenEnumerateInstances", {{"ClassName", known}, {"ContinueOnError", "TRUE"}}},
+        {22, "OpenEnumerateInstances", {{"ClassName", known}, {"OperationTimeout", "0"}}},
+        {22, "OpenEnumerateInstances", {{"ClassName", known}, {"OperationTimeout", "101"}}},
+        {21, "PullInstancesWithPath", {{"EnumerationContext", "x"}, {"MaxObjectCount", "1"}}},
+        {21, "CloseEnumeration", {{"EnumerationContext", "x"}}},
+    };
+    for (const auto& row : table) {
+        EXPECT_EQ(status(row.operation, row.parameters), row.status) << row.operation << &row - table;
+    }
+    m_namespace = "root/unknown";
+    for (const char* operation : {"GetInstance", "Nonsense", "EnumerateInstances"}) {
+        EXPECT_EQ(status(operation, {}), 3) << operation;
+    }
+}
+
+TEST_F(DispatcherTest, ShowsClasses) {
+    const auto local = call("GetClass", {{"ClassName", ClassName{"test_gadget"}}}).classes.at(0);
+    EXPECT_EQ(local.superclass, "Test_Thing");
+    const auto all = call("GetClass", {{"ClassName", ClassName{"Test_Gadget"}},
+                                       {"LocalOnly", "false"},
+                                       {"IncludeClassOrigin", "true"}})
+                         .classes.at(0);
+    const auto property = [](const cimxml::ClassElement& element, const std::string& name) {
+        for (const auto& each : element.properties) {
+            if (each.declaration.name == name) return each;
+        }
+        ADD_FAILURE() << name;
+        return cimxml::ClassProperty();
+    };
+    EXPECT_EQ(all.properties.size(), 5U);
+    EXPECT_EQ(property(all, "ID").origin, "Test_Thing");
+    EXPECT_FALSE(property(all, "ID").propagated);
+    EXPECT_EQ(property(all, "ID").qualifiers.at(0).name, "Key");
+    EXPECT_TRUE(property(all, "Caption").propagated);
+    EXPECT_EQ(local.properties.size(), 3U);
+    ASSERT_EQ(all.methods.size(), 2U);
+    EXPECT_EQ(all.methods[0].parameters.at(0).qualifiers.size(), 2U);
+
+    const auto bare = call("GetClass", {{"ClassName", ClassName{"Test_Link"}},
+                                        {"IncludeQualifiers", "false"},
+                                        {"PropertyList", std::vector<std::string>{"to"}}})
+                          .classes.at(0);
+    EXPECT_TRUE(bare.qualifiers.empty());
+    EXPECT_EQ(bare.properties.size(), 1U);
+    const auto marked = call("GetClass", {{"ClassName", ClassName{"Test_Link"}}}).classes.at(0);
+    EXPECT_EQ(marked.qualifiers.at(0).name, "Association");
+
+    EXPECT_EQ(call("EnumerateClassNames", {}).classNames,
+              (std::vector<std::string>{"Test_Link", "Test_Thing"}));
+    EXPECT_EQ(call("EnumerateClassNames", {{"DeepInheritance", "true"}}).classNames.size(), 3U);
+    EXPECT_EQ(call("EnumerateClasses", {{"ClassName", ClassName{"Test_Thing"}}}).classes.size(), 1U);
+    EXPECT_EQ(call("GetQualifier", {{"QualifierName", "key"}}).qualifiers.at(0).name, "Key");
+    EXPECT_GT(call("EnumerateQualifiers", {}).qualifiers.size(), 5U);
+}
+
+TEST_F(DispatcherTest, WalksAssociations) {
+    const ParameterValue a = gadget("a", "1");
+    EXPECT_EQ(call("Associators", {{"ObjectName", a}}).instances.size(), 1U);
+    EXPECT_EQ(call("AssociatorNames", {{"ObjectName", a}, {"Role", "from"}}).paths.size(), 1U);
+    EXPECT_EQ(call("AssociatorNames", {{"ObjectName", a}, {"Role", "To"}}).paths.size(), 0U);
+    EXPECT_EQ(
+        call("References", {{"ObjectName", a}, {"ResultClass", ClassName{"Test_Link"}}}).instances.size(),
+        1U);
+    const auto names = call("ReferenceNames", {{"ObjectName", a}}).paths;
+    ASSERT_EQ(names.size(), 1U);
+    // The path comes back in a request, with the keys of its references as texts.
+    const CimPath link = rawPath("Test_Link", {{"From", gadget("a", "1")}, {"To", gadget("b", "2")}});
+    EXPECT_EQ(call("GetInstance", {{"InstanceName", link}}).instances.size(), 1U);
+    EXPECT_TRUE(names[0].names(call("GetInstance", {{"InstanceName", link}}).instances[0].path));
+}
+
+TEST_F(DispatcherTest, CallsMethods) {
+    cimxml::RawArgument text{"text", {{}, std::string("hello"), false}};
+    cimxml::RawArgument numbers{"Numbers", {{}, std::vector<std::string>{"5", " 0x10 "}, false}};
+    const cimxml::Response response = invoke(gadget("a", "1"), "work", {numbers, text});
+    const auto& result = std::get<cimxml::ExtrinsicResult>(response.content).result;
+    EXPECT_EQ(response.name, "work");
+    EXPECT_EQ(result.returnValue, 21U);
+    EXPECT_EQ(result.outputs.size(), 2U);
+    // One element of an array may come alone, and an optional input may be left out.
+    numbers.value.data = std::string("7");
+    EXPECT_EQ(statusIn(invoke(gadget("a", "1"), "Work", {text, numbers})), 0);
+    EXPECT_EQ(statusIn(invoke(gadget("a", "1"), "Work", {text})), 0);
+
+    EXPECT_EQ(statusIn(invoke(gadget("a", "1"), "Work", {})), 1);  // in the provider's own words
+    EXPECT_EQ(statusIn(invoke(gadget("a", "9"), "Work", {text})), 6);
+    EXPECT_EQ(statusIn(invoke(rawPath("Unknown", {}), "Work", {text})), 6);
+    EXPECT_EQ(statusIn(invoke(rawPath("Test_Gadget", {}), "Work", {text})), 4);
+    EXPECT_EQ(statusIn(invoke(rawPath("Test_Gadget", {}), "Work", {text}, true)), 16);
+    EXPECT_EQ(statusIn(invoke(gadget("a", "1"), "Play", {})), 17);
+    EXPECT_EQ(statusIn(invoke(gadget("a", "1"), "NotImplemented", {})), 16);
+    EXPECT_EQ(statusIn(invoke(gadget("a", "1"), "Work", {text, text})), 4);
+    EXPECT_EQ(statusIn(invoke(gadget("a", "1"), "Work", {text, {"Unknown", {}}})), 4);
+    for (const std::string bad : {"", "x", "65536", "-1", "1.5"}) {
+        numbers.value.data = std::vector<std::string>{bad};
+        EXPECT_EQ(statusIn(invoke(gadget("a", "1"), "Work", {text, numbers})), 4) << bad;
+    }
+    numbers.value.hasNullElement = true;
+    EXPECT_EQ(statusIn(invoke(gadget("a", "1"), "Work", {text, numbers})), 4);
+}
+
+TEST_F(DispatcherTest, LetsReadersReadOnly) {
+    m_caller = {"reader", false, "localhost"};
+    EXPECT_EQ(status("GetInstance", {{"InstanceName", gadget("a", "1")}}), 0);
+    EXPECT_EQ(status("DeleteInstance", {{"InstanceName", gadget("a", "1")}}), 2);
+    EXPECT_EQ(status("CreateInstance", {}), 2);
+    EXPECT_EQ(statusIn(invoke(gadget("a", "1"), "Work", {})), 2);
+    m_caller.isAdministrator = true;
+    EXPECT_EQ(status("DeleteInstance", {{"InstanceName", gadget("a", "1")}}), 0);
+    EXPECT_EQ(status("GetInstance", {{"InstanceName", gadget("a", "1")}}), 6);
+}
+
+TEST_F(DispatcherTest, PullsToTheEnd) {
+    const auto open = [&](const std::string& count) {
+        return call("OpenEnumerateInstances",
+                    {{"ClassName", ClassName{"Test_Gadget"}}, {"MaxObjectCount", count}});
+    };
+    const auto all = open("10");
+    EXPECT_EQ(all.instances.size(), 3U);
+    EXPECT_EQ(output(all, "EndOfSequence"), "TRUE");
+
+    const auto first = open("0");
+    EXPECT_TRUE(first.instances.empty());
+    EXPECT_EQ(output(first, "EndOfSequence"), "FALSE");
+    const std::string context = output(first, "EnumerationContext");
+    const Given pull{{"EnumerationContext", context}, {"MaxObjectCount", "2"}};
+    // What is deleted meanwhile is still delivered: the enumeration holds values.
+    EXPECT_EQ(status("DeleteInstance", {{"InstanceName", gadget("a", "1")}}), 0);
+    const auto two = call("PullInstancesWithPath", pull);
+    ASSERT_EQ(two.instances.size(), 2U);
+    EXPECT_EQ(std::get<std::string>(*two.instances[0].find("ID")->value.scalar()), "a");
+
+    EXPECT_EQ(status("PullInstancePaths", pull), 21);
+    m_caller.user = "other";
+    EXPECT_EQ(status("PullInstancesWithPath", pull), 21);
+    EXPECT_EQ(status("CloseEnumeration", {{"EnumerationContext", context}}), 21);
+    m_caller.user = "admin";
+    const auto last = call("PullInstancesWithPath", pull);
+    EXPECT_EQ(last.instances.size(), 1U);
+    EXPECT_EQ(output(last, "EndOfSequence"), "TRUE");
+    EXPECT_EQ(status("PullInstancesWithPath", pull), 21);
+
+    const auto kept = open("1");
+    open("1");
+    EXPECT_EQ(status("OpenEnumerateInstancePaths", {{"ClassName", ClassName{"Test_Gadget"}}}), 27);
+    EXPECT_EQ(status("CloseEnumeration", {{"EnumerationContext", output(kept, "EnumerationContext")}}), 0);
+    const auto paths =
+        call("OpenReferenceInstancePaths", {{"InstanceName", gadget("b", "2")}, {"MaxObjectCount", "5"}});
+    EXPECT_EQ(paths.paths.size(), 1U);
+}
+
+TEST_F(DispatcherTest, RefusesEverythingWhenShuttingDown) {
+    m_dispatcher.shutDown();
+    EXPECT_EQ(status("EnumerateClassNames", {}), 28);
+    EXPECT_EQ(statusIn(invoke(gadget("a", "1"), "Work", {})), 28);
+}
+
+}  // namespace

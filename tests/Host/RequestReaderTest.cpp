@@ -1,0 +1,199 @@
+#include "Host/CimXml/RequestReader.h"
+
+#include <gtest/gtest.h>
+
+#include <random>
+
+#include "Host/CimXml/Headers.h"
+#include "Host/CimXml/RequestWriter.h"
+#include "Host/CimXml/WireError.h"
+#include "Host/WireCheck.h"
+
+namespace {
+
+using cimxml::IntrinsicCall;
+using cimxml::MethodCall;
+using cimxml::Request;
+using cimxml::WireFault;
+
+const cimxml::ParameterValue& parameter(const IntrinsicCall& call, std::string_view name) {
+    static const cimxml::ParameterValue none;
+    for (const cimxml::Parameter& each : call.parameters) {
+        if (each.name == name) return each.value;
+    }
+    return none;
+}
+
+template <class T>
+T held(const IntrinsicCall& call, std::string_view name) {
+    const T* value = std::get_if<T>(&parameter(call, name));
+    EXPECT_NE(value, nullptr) << name;
+    return value != nullptr ? *value : T{};
+}
+
+TEST(RequestReaderTest, ReadsWhatClientsSend) {
+    for (const std::string& name : test::sampleNames()) {
+        const Request request = cimxml::readRequest(test::readSample(name));
+        EXPECT_EQ(request.messageId, name.starts_with("w-") ? "4711" : "1001");
+        EXPECT_EQ(name.substr(2), request.name() + ".xml");
+    }
+    const Request read = cimxml::readRequest(test::readSample("w-GetInstance.xml"));
+    const auto& get = std::get<IntrinsicCall>(read.call);
+    EXPECT_EQ(get.namespaceName, "root/cimv2");
+    EXPECT_EQ(held<std::string>(get, "LocalOnly"), "FALSE");
+    EXPECT_EQ(held<core::CimPath>(get, "InstanceName").toString(),
+              "root/cimv2:Quenx_ConcreteJob.InstanceID=\"Quenx:FirmwareUpdate@Job#1\"");
+
+    const Request walked = cimxml::readRequest(test::readSample("p-Associators.xml"));
+    const auto& associators = std::get<IntrinsicCall>(walked.call);
+    EXPECT_EQ(held<cimxml::ClassName>(associators, "AssocClass").name, "CIM_ElementCapabilities");
+    EXPECT_EQ(held<std::vector<std::string>>(associators, "PropertyList"), std::vector<std::string>{"Name"});
+
+    const Request opened = cimxml::readRequest(test::readSample("p-OpenEnumerateInstances.xml"));
+    const auto& open = std::get<IntrinsicCall>(opened.call);
+    EXPECT_EQ(open.parameters.size(), 3U);
+    EXPECT_EQ(parameter(open, "FilterQuery").index(), 0U);
+}
+
+TEST(RequestReaderTest, ReadsMethodCallsWithAndWithoutTypes) {
+    const Request untyped = cimxml::readRequest(test::readSample("w-InstallFromURI.xml"));
+    const auto& call = std::get<MethodCall>(untyped.call);
+    EXPECT_EQ(call.object.getNamespace(), "root/cimv2");
+    EXPECT_FALSE(call.isClass);
+    ASSERT_EQ(call.arguments.size(), 3U);
+    EXPECT_EQ(std::get<std::string>(call.arguments[0].value.data), "file:///opt/x.rom");
+    EXPECT_EQ(std::get<std::vector<std::string>>(call.arguments[1].value.data),
+              (std::vector<std::string>{"5", "3"}));
+    EXPECT_EQ(std::get<core::CimPath>(call.arguments[2].value.data).toString(),
+              "//127.0.0.1/root/cimv2:Quenx_EthernetPort.DeviceID=\"eth0\"");
+
+    const Request typed = cimxml::readRequest(test::readSample("p-InstallFromURI.xml"));
+    const auto& arguments = std::get<MethodCall>(typed.call).arguments;
+    ASSERT_EQ(arguments.size(), 4U);
+    EXPECT_EQ(arguments[2].value.type, core::CimType::Uint16);
+    EXPECT_TRUE(arguments[3].value.isNull());
+}
+
+/// The call inside an envelope that is right.
+std::string wrapped(const std::string& call) {
+    return "<CIM CIMVERSION=\"2.3\" DTDVERSION=\"2.1\"><MESSAGE ID=\"1\" "
+           "PROTOCOLVERSION=\"1.1\"><SIMPLEREQ>" +
+           call + "</SIMPLEREQ></MESSAGE></CIM>";
+}
+
+std::string parameterWith(const std::string& value) {
+    return wrapped(
+        "<IMETHODCALL NAME=\"X\"><LOCALNAMESPACEPATH><NAMESPACE NAME=\"root\"/></LOCALNAMESPACEPATH>"
+        "<IPARAMVALUE NAME=\"P\">" +
+        value + "</IPARAMVALUE></IMETHODCALL>");
+}
+
+TEST(RequestReaderTest, KeepsTextsAsTheyAre) {
+    for (const auto& [text, expected] : std::initializer_list<std::pair<const char*, const char*>>{
+             {"<VALUE>  two  </VALUE>", "  two  "},
+             {"<VALUE> </VALUE>", " "},
+             {"<VALUE/>", ""},
+             {"<VALUE>&lt;a&#x20AC;<![CDATA[<&>]]>&amp;</VALUE>", "<a\xE2\x82\xAC<&>&"},
+             {"\n <VALUE>a<!-- c -->b</VALUE>\n", "ab"}}) {
+        const Request request = cimxml::readRequest(parameterWith(text));
+        EXPECT_EQ(held<std::string>(std::get<IntrinsicCall>(request.call), "P"), expected);
+    }
+}
+
+TEST(RequestReaderTest, RefusesEachFaultByItsName) {
+    const std::string good = test::readSample("w-GetInstance.xml");
+    const auto changed = [&](const std::string& from, const std::string& to) {
+        std::string text = good;
+        EXPECT_NE(text.find(from), std::string::npos) << from;
+        return text.replace(text.find(from), from.size(), to);
+    };
+    const std::string place = "<LOCALNAMESPACEPATH><NAMESPACE NAME=\"root\"/></LOCALNAMESPACEPATH>";
+    const std::pair<std::string, WireFault> table[] = {
+        {"<CIM/>", WireFault::NotValid},
+        {changed("CIMVERSION=\"2.0\"", "CIMVERSION=\"3.0\""), WireFault::UnsupportedCimVersion},
+        {changed("DTDVERSION=\"2.0\"", "DTDVERSION=\"1.0\""), WireFault::UnsupportedDtdVersion},
+        {changed("PROTOCOLVERSION=\"1.0\"", "PROTOCOLVERSION=\"2.0\""), WireFault::UnsupportedProtocol},
+        {changed("PROTOCOLVERSION=\"1.0\"", ""), WireFault::NotValid},
+        {changed("ID=\"4711\"", ""), WireFault::NotValid},
+        {changed("NAME=\"GetInstance\"", ""), WireFault::NotValid},
+        {changed("<SIMPLEREQ>", "<SIMPLEREQ>text"), WireFault::NotValid},
+        {changed("</IMETHODCALL>", ""), WireFault::NotWellFormed},
+        {"<CIM CIMVERSION='2.0' DTDVERSION='2.0'><MESSAGE ID='1' "
+         "PROTOCOLVERSION='1.0'><MULTIREQ/></MESSAGE></CIM>",
+         WireFault::MultipleRequests},
+        {"<CIM CIMVERSION='2.0' DTDVERSION='2.0'><MESSAGE ID='1' "
+         "PROTOCOLVERSION='1.0'><SIMPLERSP/></MESSAGE></CIM>",
+         WireFault::NotValid},
+        {wrapped(""), WireFault::NotValid},
+        {wrapped("<OTHERCALL/>"), WireFault::NotValid},
+        {wrapped("<IMETHODCALL NAME='X'/>"), WireFault::NotValid},
+        {wrapped("<IMETHODCALL NAME='X'><LOCALNAMESPACEPATH/></IMETHODCALL>"), WireFault::NotValid},
+        {wrapped("<METHODCALL NAME='X'>" + place + "</METHODCALL>"), WireFault::NotValid},
+        {parameterWith("<VALUE/><VALUE/>"), WireFault::NotValid},
+        {parameterWith("<VALUE><B/></VALUE>"), WireFault::NotValid},
+        {parameterWith("<UNKNOWN/>"), WireFault::NotValid},
+        {parameterWith("<VALUE.ARRAY><CLASSNAME NAME='x'/></VALUE.ARRAY>"), WireFault::NotValid},
+        {parameterWith(
+             "<INSTANCENAME CLASSNAME='C'><KEYVALUE>1</KEYVALUE><KEYVALUE>2</KEYVALUE></INSTANCENAME>"),
+         WireFault::NotValid},
+    };
+    for (const auto& [message, fault] : table) {
+        try {
+            cimxml::readRequest(message);
+            ADD_FAILURE() << "accepted: " << message;
+        } catch (const cimxml::WireError& error) {
+            EXPECT_STREQ(cimxml::cimErrorHeader(error.fault()), cimxml::cimErrorHeader(fault)) << message;
+            EXPECT_STRNE(error.what(), "");
+        }
+    }
+}
+
+TEST(RequestReaderTest, SurvivesPrefixesAndFlippedBits) {
+    std::mt19937 random(7);
+    for (const std::string& name : test::sampleNames()) {
+        const std::string good = test::readSample(name);
+        const std::size_t end = good.find("</CIM>") + 6;
+        for (std::size_t length = 0; length < end; ++length) {
+            EXPECT_THROW(cimxml::readRequest(good.substr(0, length)), cimxml::WireError) << length;
+        }
+        for (int round = 0; round < 500; ++round) {
+            std::string bad = good;
+            bad[random() % bad.size()] ^= static_cast<char>(1U << (random() % 8));
+            try {
+                cimxml::readRequest(bad);
+            } catch (const cimxml::WireError&) {
+            }
+        }
+    }
+}
+
+TEST(RequestWriterTest, WritesWhatTheReaderReads) {
+    for (const std::string& name : test::sampleNames()) {
+        if (name == "w-CreateInstance.xml") continue;  // of the instance only its name is kept
+        const std::string once = cimxml::writeRequest(cimxml::readRequest(test::readSample(name)));
+        EXPECT_EQ(cimxml::writeRequest(cimxml::readRequest(once)), once) << name;
+    }
+}
+
+TEST(HeadersTest, AreCheckedAgainstTheCall) {
+    const Request request = cimxml::readRequest(test::readSample("w-GetInstance.xml"));
+    const auto faultOf = [&](const cimxml::RequestHeaders& headers) -> std::string {
+        try {
+            cimxml::checkHeaders(headers);
+            cimxml::checkHeadersAgainst(headers, request);
+        } catch (const cimxml::WireError& error) {
+            return std::to_string(cimxml::httpStatus(error.fault())) + " " +
+                   cimxml::cimErrorHeader(error.fault());
+        }
+        return "";
+    };
+    EXPECT_EQ(faultOf({}), "");
+    EXPECT_EQ(faultOf({"methodcall", "Get%49nstance", "1.0", false}), "");
+    EXPECT_EQ(faultOf({{}, "GetClass", {}, false}), "400 header-mismatch");
+    EXPECT_EQ(faultOf({"Other", {}, {}, false}), "400 unsupported-operation");
+    EXPECT_EQ(faultOf({{}, {}, "2.0", false}), "501 unsupported-protocol-version");
+    EXPECT_EQ(faultOf({{}, {}, {}, true}), "501 multiple-requests-unsupported");
+    EXPECT_EQ(cimxml::percentDecoded("a%2Fb%3A%zz%4"), "a/b:%zz%4");
+}
+
+}  // namespace

@@ -1,0 +1,150 @@
+#include "MidAPI/Simulator/AdapterDescription.h"
+
+#include <gtest/gtest.h>
+#include <sys/stat.h>
+
+#include "MidAPI/AdapterError.h"
+#include "MidAPI/Simulator/Simulator.h"
+#include "Support/SimulatedAdapters.h"
+#include "Support/TestRoms.h"
+
+namespace {
+
+using ma::AdapterDescription;
+
+std::string errorOf(const std::function<void()>& action) {
+    try {
+        action();
+    } catch (const ma::AdapterError& error) {
+        return error.what();
+    }
+    return "no error";
+}
+
+/// An adapter that is in order, with one line more.
+std::string adapterWith(const std::string& line) {
+    return "[[adapter]]\nname = \"eth0\"\npci_address = \"0000:03:00.0\"\npci_id = \"1af4:1041\"\n"
+           "mac = \"52:54:00:12:34:56\"\n" +
+           line + "\n";
+}
+
+TEST(AdapterDescription, everyKeyIsTaken) {
+    const std::string text = adapterWith(R"(description = "a card"
+subsystem_id = "1af4:1100"
+speed = 10_000_000_000
+link = false
+updatable = false
+write_speed = 500_000
+boot_type = "fcoe"
+flash_file = "card.rom"
+components = [ { type = "IMG_CLP", revision = 65535 }, { type = "IMG_UEFI" } ]
+[[adapter.fault]]
+at = "capability-word"
+action = "stall"
+milliseconds = 5
+once = true
+[[adapter.fault]]
+at = "write"
+action = "fail"
+percent = 50
+code = 77
+text = "bank gone")");
+    const std::vector<AdapterDescription> adapters = ma::parseAdapterDescriptions(text, "a.toml");
+    ASSERT_EQ(1U, adapters.size());
+    const AdapterDescription& adapter = adapters[0];
+    EXPECT_EQ((utils::PCIAddr{3, 0, 0, false, "0000:03:00.0"}), adapter.address);
+    EXPECT_EQ("1af4:1100", ma::formatIds(adapter.ids.subsystemVendor, adapter.ids.subsystemDevice));
+    EXPECT_EQ((std::array<uint8_t, 6>{0x52, 0x54, 0, 0x12, 0x34, 0x56}), adapter.mac);
+    EXPECT_EQ(10'000'000'000U, adapter.speed);
+    EXPECT_EQ(500'000U, adapter.writeSpeed);
+    EXPECT_FALSE(adapter.linkUp || adapter.canBeUpdated);
+    EXPECT_EQ(ma::BootType::FCoE, adapter.bootType);
+    EXPECT_EQ("IMG_CLP 65535, IMG_UEFI 1", test::describeComponents(adapter.components));
+    ASSERT_EQ(2U, adapter.faults.size());
+    EXPECT_EQ(ma::Operation::CapabilityWord, adapter.faults[0].at);
+    EXPECT_EQ(ma::Fault::Action::Stall, adapter.faults[0].action);
+    EXPECT_TRUE(adapter.faults[0].once && adapter.faults[0].milliseconds == 5);
+    EXPECT_EQ(50, adapter.faults[1].percent);
+    EXPECT_EQ(77U, adapter.faults[1].code);
+    EXPECT_EQ("bank gone", adapter.faults[1].text);
+}
+
+TEST(AdapterDescription, addressesWithoutDomainOrFunction) {
+    const auto addressOf = [](const std::string& address) {
+        std::string text = adapterWith("");
+        text.replace(text.find("0000:03:00.0"), 12, address);
+        return ma::parseAdapterDescriptions(text, "a.toml").at(0).address;
+    };
+    EXPECT_EQ((utils::PCIAddr{0x1f, 0x1e, 7, false, "0000:1f:1e.7"}), addressOf("1f:1e.7"));
+    EXPECT_EQ((utils::PCIAddr{0x1f, 0x1e, 0, true, "0001:1f:1e"}), addressOf("0001:1F:1e"));
+}
+
+TEST(AdapterDescription, mistakesAreNamedWithPlaceAndRemedy) {
+    const std::pair<std::string, const char*> table[] = {
+        {"[[adapter]]\nname =", "a.toml, line 2: "},
+        {"\n[adaptor]", "a.toml, line 2: adapter description: unknown key \"adaptor\"; the keys are adapter"},
+        {"adapter = 1", "line 1: adapter description: \"adapter\" must be a list of tables"},
+        {"adapter = [ 1 ]", "must be a list of tables"},
+        {"a = 1\n\xEF\xB7\xB6", "a.toml, line 2: "},  // U+FDB6 and a letter: see MidAPI/Toml.h
+        {"a = [[1\n\xD2\x99]]", "a.toml, line 2: "},
+        {"[[adapter]]", "line 1: adapter 1: \"name\" is missing; write for example name = \"eth0\""},
+        {"[[adapter]]\nname = 7", "line 2: adapter 1: \"name\" must be a text in quotes"},
+        {"[[adapter]]\nname = \"\"", "it must be 1 to 64 bytes"},
+        {"[[adapter]]\nname = \"a\\nb\"", "\"name\" is \"a?b\""},
+        {"[[adapter]]\nname = \"eth0\"", "adapter \"eth0\": \"pci_address\" is missing"},
+        {adapterWith("speeed = 1"), "line 6: adapter \"eth0\": unknown key \"speeed\""},
+        {adapterWith("speed = -1"), "\"speed\" must be a whole number from 0 to"},
+        {adapterWith("speed = \"fast\""), "\"speed\" must be a whole number"},
+        {adapterWith("link = 1"), "\"link\" must be true or false"},
+        {adapterWith("boot_type = \"disk\""),
+         "\"boot_type\" is \"disk\", it must be none, pxe, iscsi, fcoe or uefi"},
+        {adapterWith("subsystem_id = \"1af4\""), "\"subsystem_id\" is \"1af4\", it must be like"},
+        {adapterWith("components = [ { revision = 1 } ]"), "a component of \"eth0\": \"type\" is missing"},
+        {adapterWith("components = [ { type = \"IMG_X\" } ]"), "it must be IMG_CLP, IMG_iSCSI"},
+        {adapterWith("components = [ { type = \"IMG_PXE\", revision = 65536 } ]"), "from 0 to 65535"},
+        {adapterWith("[[adapter.fault]]\naction = \"kill\""), "a fault of \"eth0\": \"at\" is missing"},
+        {adapterWith("[[adapter.fault]]\nat = \"write\"\naction = \"burn\""),
+         "line 8: a fault of \"eth0\": \"action\""},
+        {adapterWith("[[adapter.fault]]\nat = \"write\"\naction = \"fail\"\npercent = 101"), "from 0 to 100"},
+        {adapterWith("") + adapterWith(""), "two adapters are called \"eth0\""},
+    };
+    for (const auto& [text, expected] : table) {
+        const std::string error = errorOf([&text = text] { ma::parseAdapterDescriptions(text, "a.toml"); });
+        EXPECT_NE(std::string::npos, error.find(expected)) << error << "\n" << text;
+    }
+    for (const char* address :
+         {"0000:03:00.8", "0000:03:20.0", "0000:3:00.0", "03:00.", "03:00.0x", "", ":::", "03"}) {
+        std::string text = adapterWith("");
+        text.replace(text.find("0000:03:00.0"), 12, address);
+        const std::string error = errorOf([&] { ma::parseAdapterDescriptions(text, "a.toml"); });
+        EXPECT_NE(std::string::npos, error.find("must be like \"0000:03:00.0\"")) << error;
+    }
+}
+
+TEST(AdapterDescription, filesThatCannotBeUsedAreNamed) {
+    const test::TempFolder folder;
+    const auto startWith = [&](const std::string& description) {
+        return errorOf([&] { ma::Simulator(description, folder / "state"); });
+    };
+    EXPECT_NE(std::string::npos, startWith(folder / "none.toml").find("there is no adapter description"));
+    EXPECT_NE(std::string::npos, startWith(folder.path()).find("cannot read " + folder.path()));
+    ASSERT_EQ(0, ::mkfifo((folder / "fifo").c_str(), 0600));  // must not hang
+
+    const std::string description = folder.write("a.toml", adapterWith("flash_file = \"card.rom\""));
+    EXPECT_NE(std::string::npos, startWith(description).find("card.rom is not there"));
+    folder.write("card.rom", "no rom at all, but long enough for a header");
+    EXPECT_NE(std::string::npos, startWith(description).find("is no intact ROM image: image 1 at 0x0"));
+    folder.write("fifo.toml", adapterWith("flash_file = \"fifo\""));
+    EXPECT_NE(std::string::npos, startWith(folder / "fifo.toml").find("the file is empty"));
+}
+
+TEST(AdapterDescription, theFactoryFlashIsTheFileWithTheListedComponents) {
+    const test::SimulatedAdapters adapters(
+        adapterWith("flash_file = \"" + test::realRomPath("efi-virtio") +
+                    "\"\ncomponents = [ { type = \"IMG_UEFI\", revision = 9 }, "
+                    "{ type = \"IMG_iSCSI\", revision = 4 } ]"));
+    EXPECT_EQ("IMG_iSCSI 4, IMG_PXE 1, IMG_UEFI 9", test::componentsOf("eth0"));
+    EXPECT_FALSE(ma::parseOptionRom(adapters->flashContent("eth0")).error);
+}
+
+}  // namespace

@@ -1,0 +1,130 @@
+#include "MidAPI/Simulator/Fault.h"
+
+#include <gtest/gtest.h>
+
+#include <chrono>
+#include <functional>
+
+#include "MidAPI/AdapterError.h"
+#include "MidAPI/ma.h"
+#include "Support/SimulatedAdapters.h"
+#include "Support/TestRoms.h"
+
+namespace {
+
+using Action = ma::Fault::Action;
+using ma::Operation;
+using utils::FirmwareType;
+
+const std::vector<uint8_t>& newImage() {
+    static const std::vector<uint8_t> image = test::madeRom({{FirmwareType::PXE, 9}});
+    return image;
+}
+
+/// Does one operation on eth0 and says in a word how it went.
+std::string outcome(Operation operation) try {
+    uint32_t code = 0;
+    std::string text;
+    switch (operation) {
+        case Operation::Enumerate:
+            return std::to_string(ma::enumerateAdapters().size());
+        case Operation::PciAddress:
+            return ma::getPCIAddress("eth0").text;
+        case Operation::FirmwareVersion:
+            return test::componentsOf("eth0");
+        case Operation::Prepare:
+            return std::to_string(test::prepareImage("eth0", newImage()).status);
+        case Operation::Write: {
+            const test::WriteResult result = test::writeImage("eth0", newImage());
+            return result.done ? "done" : std::to_string(result.code) + " " + result.text;
+        }
+        case Operation::CapabilityWord:
+            return ma::updateCapabilityWord("eth0", {FirmwareType::PXE}, code, text)
+                       ? "done"
+                       : std::to_string(code) + " " + text;
+        case Operation::BootType:
+            return ma::setBootType("eth0", ma::BootType::None) ? "done" : "not done";
+        case Operation::Info:
+            return std::to_string(ma::getAdapterInfo("eth0").speed);
+    }
+    return "";
+} catch (const ma::PowerLoss& loss) {
+    return std::string("power: ") + loss.what();
+} catch (const ma::AdapterError& error) {
+    return std::string("thrown: ") + error.what();
+}
+
+struct Case {
+    Operation at;
+    const char* sound;   // without a fault
+    const char* failed;  // with Action::Fail, code 77, text "worn"
+};
+
+const Case CASES[] = {
+    {Operation::Enumerate, "5", "0"},
+    {Operation::PciAddress, "0000:03:00.0", "thrown: adapter eth0: worn"},
+    {Operation::FirmwareVersion, "IMG_PXE 1, IMG_UEFI 0", "unreadable"},
+    {Operation::Prepare, "0", "77"},
+    {Operation::CapabilityWord, "done", "77 worn"},
+    {Operation::BootType, "done", "not done"},
+    {Operation::Info, "10000000000", "thrown: adapter eth0: worn"},
+    {Operation::Write, "done", "77 worn"},
+};
+
+TEST(Faults, strikeAtTheirOperationAlone) {
+    for (const Case& one : CASES) {
+        SCOPED_TRACE(one.sound);
+        const test::SimulatedAdapters adapters;
+        adapters->injectFault("eth0", {.at = one.at, .action = Action::Fail, .code = 77, .text = "worn"});
+        for (const Case& other : CASES) {
+            if (other.at == one.at || other.at == Operation::Write) continue;
+            EXPECT_EQ(other.sound, outcome(other.at));
+        }
+        EXPECT_EQ(one.failed, outcome(one.at));
+        EXPECT_EQ(one.failed, outcome(one.at)) << "until it is cancelled";
+        adapters->clearFaults("eth0");
+        EXPECT_EQ(one.sound, outcome(one.at));
+    }
+}
+
+TEST(Faults, throwAndStallOnce) {
+    for (const Case& one : CASES) {
+        SCOPED_TRACE(one.sound);
+        const test::SimulatedAdapters adapters;
+        adapters->injectFault("eth0", {.at = one.at, .action = Action::Throw, .text = "gone", .once = true});
+        adapters->injectFault("eth0",
+                              {.at = one.at, .action = Action::Stall, .milliseconds = 20, .once = true});
+        EXPECT_EQ("thrown: gone", outcome(one.at));
+        const auto begin = std::chrono::steady_clock::now();
+        EXPECT_EQ(one.sound, outcome(one.at));
+        EXPECT_LE(std::chrono::milliseconds(20), std::chrono::steady_clock::now() - begin);
+    }
+}
+
+TEST(Faults, aFailedWriteLeavesTheOldImageAndFreesTheAdapter) {
+    for (const uint16_t percent : std::initializer_list<uint16_t>{0, 50, 100}) {
+        for (const Action action : {Action::Fail, Action::Throw, Action::PowerLoss}) {
+            test::SimulatedAdapters adapters;
+            adapters->injectFault(
+                "eth0", {.action = action, .percent = percent, .code = 5, .text = "worn", .once = true});
+            EXPECT_NE("done", outcome(Operation::Write));
+            EXPECT_EQ("IMG_PXE 1, IMG_UEFI 0", test::componentsOf("eth0"));
+            if (action == Action::PowerLoss) adapters.restart();
+            EXPECT_EQ("IMG_PXE 1, IMG_UEFI 0", test::componentsOf("eth0"));
+            EXPECT_EQ("done", outcome(Operation::Write));
+            EXPECT_EQ("IMG_PXE 9, IMG_UEFI 0", test::componentsOf("eth0"));
+        }
+    }
+}
+
+TEST(Faults, areTakenFromTheDescription) {
+    std::string description = test::TEST_ADAPTERS;
+    description.insert(
+        description.find("[[adapter]]", 5),
+        "[[adapter.fault]]\nat = \"write\"\naction = \"fail\"\npercent = 30\ncode = 12\nonce = true\n");
+    const test::SimulatedAdapters adapters(description);
+    EXPECT_EQ("12 ordered fault: fail at write", outcome(Operation::Write));
+    EXPECT_EQ("done", outcome(Operation::Write));
+}
+
+}  // namespace

@@ -1,0 +1,168 @@
+#include "MidAPI/ImagePreparation.h"
+
+#include <gtest/gtest.h>
+
+#include "MidAPI/OptionRomWriter.h"
+#include "MidAPI/ma.h"
+#include "Support/SimulatedAdapters.h"
+#include "Support/SyslogCapture.h"
+#include "Support/TestRoms.h"
+
+namespace {
+
+using utils::FirmwareType;
+using Rom = std::vector<uint8_t>;
+using Types = std::vector<FirmwareType>;
+
+constexpr FirmwareType NO_TYPE = FirmwareType::None;
+constexpr FirmwareType CLP = FirmwareType::CLP;
+constexpr FirmwareType ISCSI = FirmwareType::iSCSI;
+constexpr FirmwareType PXE = FirmwareType::PXE;
+constexpr FirmwareType UEFI = FirmwareType::UEFI;
+
+Rom wrongClass() {
+    ma::NewRomImage vga;
+    vga.type = PXE;
+    vga.vendorId = 0x1af4;
+    vga.deviceId = 0x1041;
+    vga.classCode = 0x030000;
+    return ma::makeRomImage(vga);
+}
+
+Rom withDeviceList(uint16_t device, std::vector<uint16_t> others) {
+    ma::NewRomImage image;
+    image.type = PXE;
+    image.vendorId = 0x1af4;
+    image.deviceId = device;
+    image.furtherDeviceIds = std::move(others);
+    image.codeRevision = 1;
+    return ma::makeRomImage(image);
+}
+
+Rom cutShort(Rom rom, std::size_t length) {
+    rom.resize(length);
+    return rom;
+}
+
+struct Case {
+    const char* what;
+    const char* adapter;
+    Rom file;
+    Types requested;
+    int status;
+    Types written;       // what is left in the type list
+    const char* reason;  // a part of the logged line
+};
+
+std::vector<Case> realImageCases() {
+    const Rom virtio = test::realRom("efi-virtio");
+    const Rom pxeOnly = test::realRom("pxe-virtio");
+    return {
+        {"equal is fit", "eth0", virtio, {}, 0, {PXE, UEFI}, ""},
+        {"newer is fit", "eth0", test::withRevision(virtio, 2), {}, 0, {PXE, UEFI}, ""},
+        {"one of two", "eth0", virtio, {UEFI}, 0, {UEFI}, ""},
+        {"the other one; type 0 and repeats ignored", "eth0", virtio, {PXE, NO_TYPE, PXE}, 0, {PXE}, ""},
+        {"only type 0 stands for all", "eth0", virtio, {NO_TYPE}, 0, {PXE, UEFI}, ""},
+        {"ascending, whatever the order", "eth0", virtio, {UEFI, PXE}, 0, {PXE, UEFI}, ""},
+        {"a file with less than the adapter", "eth0", pxeOnly, {}, 0, {PXE}, ""},
+        {"the second function of the card", "eth1", virtio, {}, 0, {PXE, UEFI}, ""},
+        {"other card", "eth2", virtio, {}, 2, {}, "is for PCI device 1af4:1041, the adapter is 10ec:8139"},
+        {"other card, cut short", "eth2", cutShort(virtio, 100'000), {}, 2, {}, "1af4:1041"},
+        {"its own card", "eth2", test::realRom("efi-rtl8139"), {}, 0, {PXE, UEFI}, ""},
+        {"images that disagree", "eth0", test::realRom("efi-ne2k_pci"), {}, 2, {}, "0000:0000"},
+        {"cannot be updated", "eth3", test::realRom("pxe-pcnet"), {}, 2, {}, "cannot be updated"},
+        {"other types",
+         "eth4",
+         test::realRom("efi-vmxnet3"),
+         {},
+         4,
+         {PXE, UEFI},
+         "carries IMG_iSCSI, IMG_UEFI"},
+        {"the types it has", "eth4", test::realRom("efi-vmxnet3"), {UEFI}, 0, {UEFI}, ""},
+        {"cut short", "eth0", cutShort(virtio, 100'000), {}, 1, {}, "cut short"},
+        {"cut at an image's end", "eth0", cutShort(virtio, 75'776), {PXE}, 1, {PXE}, "cut short"},
+        {"empty", "eth0", {}, {}, 1, {}, "the file is empty"},
+        {"no such adapter", "eth9", virtio, {}, 1, {}, "no such adapter"},
+        {"a type the file has not",
+         "eth0",
+         virtio,
+         {ISCSI, PXE},
+         5,
+         {ISCSI, PXE},
+         "no image of type IMG_iSCSI"},
+        {"a number that is no type",
+         "eth0",
+         virtio,
+         {static_cast<FirmwareType>(77)},
+         5,
+         {static_cast<FirmwareType>(77)},
+         "no image of type 77"},
+    };
+}
+
+std::vector<Case> madeImageCases() {
+    const Rom older = test::madeRom({{PXE, 0}, {UEFI, 0}});
+    const Rom olderAndMore = test::madeRom({{PXE, 0}, {ISCSI, 1}});
+    const Rom clp = test::madeRom({{CLP, 1}});
+    return {
+        {"older", "eth0", older, {}, 3, {PXE, UEFI}, "IMG_PXE would go back from version 1 (installed) to 0"},
+        {"the part that is not older", "eth0", older, {UEFI}, 0, {UEFI}, ""},
+        {"older with other types", "eth0", olderAndMore, {}, 4, {ISCSI, PXE}, "adapter carries"},
+        {"missing type before older", "eth0", older, {ISCSI}, 5, {ISCSI}, "it has IMG_PXE, IMG_UEFI"},
+        {"CLP is a type of its own", "eth0", clp, {}, 4, {CLP, PXE}, "IMG_CLP, IMG_PXE"},
+        {"and brings its image", "eth0", clp, {CLP}, 4, {CLP, PXE}, ""},
+        {"VGA", "eth0", wrongClass(), {}, 2, {}, "not for a network adapter"},
+        {"listed device", "eth0", withDeviceList(0x1000, {0x1041}), {}, 0, {PXE}, ""},
+        {"not listed", "eth0", withDeviceList(0x1000, {0x1042, 0x1043}), {}, 2, {}, "1af4:1000"},
+    };
+}
+
+TEST(ImagePreparation, answersByTheTable) {
+    const test::SimulatedAdapters adapters;
+    const test::SyslogCapture log;
+    std::vector<Case> cases = realImageCases();
+    for (Case& made : madeImageCases())
+        cases.push_back(std::move(made));
+    for (const Case& one : cases) {
+        SCOPED_TRACE(one.what);
+        test::SyslogCapture::clear();
+        const test::PreparedImage prepared = test::prepareImage(one.adapter, one.file, one.requested);
+        EXPECT_EQ(one.status, prepared.status);
+        EXPECT_EQ(one.written, prepared.types);
+        EXPECT_EQ(one.status != 0, test::SyslogCapture::contains("status " + std::to_string(one.status)));
+        EXPECT_TRUE(one.status == 0 || test::SyslogCapture::contains(one.reason)) << one.reason;
+        if (one.status != 0 && one.status != 3 && one.status != 4) {
+            EXPECT_EQ(one.file.size(), prepared.image.size()) << "the size was changed";
+            continue;
+        }
+        // Also when the caller must insist, the output is an image that can be written.
+        const ma::RomFile rom = ma::parseOptionRom(prepared.image);
+        ASSERT_FALSE(rom.error) << *rom.error;
+        Types found;
+        for (const utils::FirmwareVersionInfo& component : rom.components())
+            found.push_back(component.type);
+        EXPECT_EQ(one.written, found);
+    }
+}
+
+TEST(ImagePreparation, losingTheClpEntryIsAnotherType) {
+    const ma::PreparationTarget target{0x1af4, 0x1041, true, {{CLP, 1}, {PXE, 1}}};
+    EXPECT_EQ(ma::IMAGE_TYPES_DIFFER, ma::assessImage(target, test::madeRom({{PXE, 1}}), {}).status);
+    EXPECT_EQ(ma::PREPARED, ma::assessImage(target, test::madeRom({{CLP, 1}}), {PXE}).status);
+}
+
+TEST(ImagePreparation, missingBuffersAreInvalid) {
+    const test::SimulatedAdapters adapters;
+    const Rom rom = test::madeRom({{PXE, 1}});
+    Rom output(rom.size());
+    const auto size = static_cast<uint32_t>(rom.size());
+    uint32_t imageSize = size;
+    Types types;
+    EXPECT_EQ(1, ma::prepareFlashImage("eth0", nullptr, size, output.data(), &imageSize, types));
+    EXPECT_EQ(1, ma::prepareFlashImage("eth0", rom.data(), size, nullptr, &imageSize, types));
+    EXPECT_EQ(1, ma::prepareFlashImage("eth0", rom.data(), size, output.data(), nullptr, types));
+    imageSize = size - 1;
+    EXPECT_EQ(1, ma::prepareFlashImage("eth0", rom.data(), size, output.data(), &imageSize, types));
+}
+
+}  // namespace

@@ -1,0 +1,99 @@
+#include <gtest/gtest.h>
+
+#include <memory>
+
+#include "MidAPI/Simulator/FlashState.h"
+#include "MidAPI/Simulator/Simulator.h"
+#include "Support/PowerCut.h"
+#include "Support/SimulatedAdapters.h"
+#include "Support/TempFolder.h"
+#include "Support/TestRoms.h"
+
+namespace {
+
+using test::Cut;
+using test::CutFiles;
+using test::Medium;
+using utils::FirmwareType;
+using Rom = std::vector<uint8_t>;
+
+Rom bigRom(uint16_t revision) {
+    ma::NewRomImage image;
+    image.type = FirmwareType::PXE;
+    image.vendorId = 0x1af4;
+    image.deviceId = 0x1041;
+    image.codeRevision = revision;
+    image.length = 10'240;  // three chunks
+    return ma::makeRomImage(image);
+}
+
+std::vector<ma::AdapterDescription> oneAdapter() {
+    auto adapters = ma::parseAdapterDescriptions(test::TEST_ADAPTERS, "");
+    adapters.resize(1);
+    return adapters;
+}
+
+bool install(ma::Simulator& simulator, const Rom& image) {
+    uint32_t code = 0;
+    std::string text;
+    const bool done =
+        simulator.writeFlashImage("eth0", image.data(), static_cast<uint32_t>(image.size()), code, text);
+    EXPECT_TRUE(done) << text;
+    return done && simulator.updateCapabilityWord("eth0", {FirmwareType::PXE}, code, text) &&
+           simulator.setBootType("eth0", ma::BootType::PXE);
+}
+
+/// Switches on, updates to revision 3 and loses power at the k-th call. Returns false when k was never
+/// reached.
+bool updateAndCut(const std::string& root, int cutAt, const Medium& medium, bool& finished) {
+    const auto files = std::make_shared<CutFiles>(cutAt);
+    files->adopt(root);
+    finished = false;
+    try {
+        ma::Simulator simulator(oneAdapter(), root, files);
+        finished = install(simulator, bigRom(3));
+    } catch (const Cut&) {
+    }
+    files->lose(medium, root);
+    return files->wasCut();
+}
+
+/// Tries every k on one kind of medium. Returns how many cuts there were.
+int cutEverywhere(bool updatedBefore, const Medium& medium) {
+    for (int cutAt = 1;; ++cutAt) {
+        SCOPED_TRACE("cut at call " + std::to_string(cutAt));
+        const test::TempFolder folder;
+        const std::string root = folder.path();
+        if (updatedBefore) {
+            ma::Simulator before(oneAdapter(), root, std::make_shared<test::UnsyncedFiles>());
+            install(before, bigRom(2));
+        }
+        const Rom old = ma::Simulator(oneAdapter(), root).flashContent("eth0");
+        bool finished = false;
+        const bool cut = updateAndCut(root, cutAt, medium, finished);
+
+        ma::Simulator after(oneAdapter(), root, std::make_shared<test::UnsyncedFiles>());
+        const Rom found = after.flashContent("eth0");
+        const Rom updated = ma::mergeOptionRoms(old, bigRom(3));
+        EXPECT_TRUE(found == updated || (!finished && found == old)) << test::describeRom(found);
+        EXPECT_GE(1, after.flashState("eth0").activeBank);
+        EXPECT_TRUE(install(after, bigRom(4)));
+        EXPECT_EQ("IMG_PXE 4, IMG_UEFI 0", test::describeRom(after.flashContent("eth0")));
+        if (!cut) return cutAt - 1;
+    }
+}
+
+TEST(PowerLoss, atEveryCallLeavesABootableBank) {
+    for (const bool updatedBefore : {false, true}) {
+        for (const Medium& medium : test::MEDIA) {
+            SCOPED_TRACE(std::string(updatedBefore ? "second" : "first") + " update, entries " +
+                         (medium.keepsEntries ? "kept" : "lost") + ", contents " +
+                         (medium.keepsContents ? "kept" : "lost"));
+            const int cuts = cutEverywhere(updatedBefore, medium);
+            EXPECT_LT(15, cuts);
+            RecordProperty(updatedBefore ? "cutsOfSecondUpdate" : "cutsOfFirstUpdate", cuts);
+        }
+    }
+}
+
+}  // namespace

@@ -1,0 +1,307 @@
+#include "MidAPI/Simulator/Simulator.h"
+
+#include <gtest/gtest.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <atomic>
+#include <chrono>
+#include <cstdlib>
+#include <filesystem>
+#include <future>
+#include <set>
+#include <thread>
+
+#include "MidAPI/AdapterError.h"
+#include "MidAPI/Simulator/FlashState.h"
+#include "MidAPI/ma.h"
+#include "Support/SimulatedAdapters.h"
+#include "Support/TestRoms.h"
+
+namespace {
+
+using utils::FirmwareType;
+using Rom = std::vector<uint8_t>;
+
+constexpr FirmwareType CLP = FirmwareType::CLP;
+constexpr FirmwareType ISCSI = FirmwareType::iSCSI;
+constexpr FirmwareType PXE = FirmwareType::PXE;
+constexpr FirmwareType UEFI = FirmwareType::UEFI;
+constexpr uint32_t PXE_AND_UEFI_BITS = 1U << 3 | 1U << 4;
+
+/// Prepares and writes; the prepare must allow it, if need be by force.
+test::WriteResult install(const std::string& adapter, const Rom& file, std::vector<FirmwareType> types = {}) {
+    const test::PreparedImage prepared = test::prepareImage(adapter, file, std::move(types));
+    EXPECT_TRUE(prepared.status == 0 || prepared.status == 3 || prepared.status == 4) << prepared.status;
+    return test::writeImage(adapter, prepared.image);
+}
+
+TEST(Simulator, tellsWhatTheDescriptionSays) {
+    const test::SimulatedAdapters adapters;
+    EXPECT_EQ((utils::StringArray{"eth0", "eth1", "eth2", "eth3", "eth4"}), ma::enumerateAdapters());
+    EXPECT_TRUE(ma::getPCIAddress("eth0").sameAdapter(ma::getPCIAddress("eth1")));
+    EXPECT_FALSE(ma::getPCIAddress("eth0").sameAdapter(ma::getPCIAddress("eth2")));
+    EXPECT_TRUE(ma::getCanBeUpdated("eth0"));
+    EXPECT_FALSE(ma::getCanBeUpdated("eth3"));
+    EXPECT_EQ("IMG_iSCSI 1, IMG_UEFI 0", test::componentsOf("eth4"));
+    const ma::AdapterInfo info = ma::getAdapterInfo("eth0");
+    EXPECT_EQ((std::array<uint8_t, 6>{0x52, 0x54, 0, 0, 0, 0x10}), info.permanentMac);
+    EXPECT_EQ(10'000'000'000U, info.speed);
+    EXPECT_TRUE(info.linkUp);
+    EXPECT_EQ("1af4:1041", ma::formatIds(info.ids.vendor, info.ids.device));
+    EXPECT_EQ("IMG_PXE 1, IMG_UEFI 0", test::describeComponents(info.components));
+    EXPECT_FALSE(std::filesystem::exists(adapters.stateDirectory())) << "reading must not write";
+}
+
+TEST(Simulator, unknownAdaptersAreRefused) {
+    const test::SimulatedAdapters adapters;
+    uint32_t code = 0;
+    std::string text;
+    EXPECT_THROW(ma::getPCIAddress("eth9"), ma::AdapterError);
+    EXPECT_THROW(ma::getAdapterInfo("eth9"), ma::AdapterError);
+    EXPECT_FALSE(ma::getCanBeUpdated("eth9"));
+    EXPECT_EQ("unreadable", test::componentsOf("eth9"));
+    EXPECT_EQ(0, ma::getFlashImageUpdateProgress("eth9"));
+    EXPECT_FALSE(ma::setBootType("eth9", ma::BootType::None));
+    EXPECT_FALSE(ma::updateCapabilityWord("eth9", {PXE}, code, text));
+    EXPECT_EQ(ma::ERROR_UNKNOWN_ADAPTER, code);
+    EXPECT_EQ("there is no adapter eth9", test::writeImage("eth9", {}).text);
+}
+
+TEST(Simulator, anUpdateIsReadBackAlsoAfterARestart) {
+    test::SimulatedAdapters adapters;
+    const Rom newer = test::withRevision(test::realRom("efi-virtio"), 7);
+    const test::WriteResult result = install("eth0", newer);
+    EXPECT_TRUE(result.done && result.code == 0 && result.text.empty()) << result.text;
+    EXPECT_EQ("IMG_PXE 7, IMG_UEFI 7", test::componentsOf("eth0"));
+    EXPECT_EQ("IMG_PXE 1, IMG_UEFI 0", test::componentsOf("eth1")) << "each function has its own flash";
+    adapters.restart();
+    EXPECT_EQ("IMG_PXE 7, IMG_UEFI 7", test::componentsOf("eth0"));
+    EXPECT_EQ(newer, adapters->flashContent("eth0"));
+    EXPECT_EQ(3, test::prepareImage("eth0", test::realRom("efi-virtio")).status);
+    EXPECT_TRUE(install("eth0", test::realRom("efi-virtio")).done);
+    EXPECT_EQ("IMG_PXE 1, IMG_UEFI 0", test::componentsOf("eth0"));
+}
+
+TEST(Simulator, onlyTheWrittenTypesAreReplaced) {
+    const test::SimulatedAdapters adapters;
+    EXPECT_TRUE(install("eth0", test::madeRom({{PXE, 5}, {UEFI, 6}}), {PXE}).done);
+    EXPECT_EQ("IMG_PXE 5, IMG_UEFI 0", test::componentsOf("eth0"));
+    EXPECT_TRUE(install("eth0", test::madeRom({{ISCSI, 2}})).done);
+    EXPECT_EQ("IMG_iSCSI 2, IMG_PXE 5, IMG_UEFI 0", test::componentsOf("eth0"));
+}
+
+TEST(Simulator, anotherProcessSeesTheUpdate) {
+    const test::SimulatedAdapters adapters;
+    ma::Simulator other(adapters.descriptionFile(), adapters.stateDirectory());
+    std::vector<utils::FirmwareVersionInfo> components;
+    for (const uint32_t revision : {2U, 3U, 4U}) {
+        EXPECT_TRUE(install("eth0", test::madeRom({{PXE, revision}})).done);
+        ASSERT_TRUE(other.getAdapterFirmwareVersion("eth0", components));
+        EXPECT_EQ(revision, components.at(0).version);
+    }
+}
+
+TEST(Simulator, capabilityWordAndBootTypeAreKept) {
+    test::SimulatedAdapters adapters;
+    uint32_t code = 9;
+    std::string text = "old";
+    EXPECT_EQ(PXE_AND_UEFI_BITS, adapters->flashState("eth0").capabilityWord);
+    EXPECT_EQ(static_cast<uint32_t>(ma::BootType::iSCSI), adapters->flashState("eth4").bootType);
+    EXPECT_TRUE(install("eth0", test::madeRom({{CLP, 2}})).done);
+    EXPECT_TRUE(ma::updateCapabilityWord("eth0", {CLP, PXE, ISCSI}, code, text));
+    EXPECT_TRUE(code == 0 && text.empty());
+    EXPECT_TRUE(ma::setBootType("eth4", ma::BootType::None));
+    adapters.restart();
+    EXPECT_EQ(PXE_AND_UEFI_BITS | 1U << 1, adapters->flashState("eth0").capabilityWord)
+        << "nothing that is not there";
+    EXPECT_EQ(0U, adapters->flashState("eth4").bootType);
+    EXPECT_EQ("IMG_iSCSI 1, IMG_UEFI 0", test::componentsOf("eth4"));
+}
+
+TEST(Simulator, whatIsNoImageForTheCardIsNotWritten) {
+    const test::SimulatedAdapters adapters;
+    Rom broken = test::madeRom({{PXE, 9}});
+    broken.back() ^= 1;
+    EXPECT_EQ(ma::ERROR_BAD_IMAGE, test::writeImage("eth0", broken).code);
+    EXPECT_EQ(ma::ERROR_BAD_IMAGE, test::writeImage("eth0", {}).code);
+    EXPECT_EQ(ma::ERROR_BAD_IMAGE, test::writeImage("eth0", test::madeRom({{PXE, 9}}, 0x10ec, 0x8139)).code);
+    EXPECT_EQ(ma::ERROR_NOT_UPDATABLE,
+              test::writeImage("eth3", test::madeRom({{PXE, 9}}, 0x1022, 0x2000)).code);
+    EXPECT_EQ("IMG_PXE 1, IMG_UEFI 0", test::componentsOf("eth0"));
+}
+
+TEST(Simulator, moreImagesThanAChainMayHaveAreNotWritten) {
+    const test::SimulatedAdapters adapters;
+    const auto images = [](FirmwareType type) {
+        const Rom one = test::madeRom({{type, 9}});
+        Rom many(40 * one.size());
+        ma::composeOptionRom(std::vector<std::span<const uint8_t>>(40, one), many);
+        return many;
+    };
+    EXPECT_TRUE(test::writeImage("eth0", images(PXE)).done);
+    const test::WriteResult result = test::writeImage("eth0", images(UEFI));
+    EXPECT_EQ(ma::ERROR_BAD_IMAGE, result.code);
+    EXPECT_NE(std::string::npos, result.text.find("more than 64 images")) << result.text;
+    EXPECT_EQ("IMG_PXE 9, IMG_UEFI 0", test::componentsOf("eth0"));
+}
+
+TEST(Simulator, aDeviceThatCannotBeWrittenSaysWhy) {
+    const test::SimulatedAdapters adapters;
+    adapters.folder().write("state", "a file where the folder should be");
+    const test::WriteResult result = test::writeImage("eth0", test::madeRom({{PXE, 9}}));
+    EXPECT_EQ(ma::ERROR_DEVICE, result.code);
+    EXPECT_NE(std::string::npos, result.text.find("Not a directory")) << result.text;
+}
+
+TEST(Simulator, damageIsSurvivedWhereABankIsLeftAndNamedWhereNot) {
+    test::SimulatedAdapters adapters;
+    EXPECT_TRUE(install("eth0", test::madeRom({{PXE, 2}})).done);
+    EXPECT_TRUE(install("eth0", test::madeRom({{PXE, 3}})).done);
+    const uint8_t active = adapters->flashState("eth0").activeBank;
+    adapters.folder().write("state/eth0/bank-" + std::to_string(active) + ".rom", "worn out");
+    adapters.restart();
+    EXPECT_EQ("IMG_PXE 2, IMG_UEFI 0", test::componentsOf("eth0"));
+    EXPECT_TRUE(install("eth0", test::madeRom({{PXE, 4}})).done) << "into the damaged bank";
+    EXPECT_EQ("IMG_PXE 4, IMG_UEFI 0", test::componentsOf("eth0"));
+
+    adapters.folder().write("state/eth0/state", "no record");
+    EXPECT_THROW(test::componentsOf("eth0"), ma::AdapterError);
+    EXPECT_EQ(6, test::prepareImage("eth0", test::madeRom({{PXE, 5}})).status);
+    EXPECT_EQ("IMG_PXE 1, IMG_UEFI 0", test::componentsOf("eth1"));
+}
+
+TEST(Simulator, namesOfAnyPrintableKindAreKeptApart) {
+    const std::string names[] = {"../eth0", "a/b", "\xC3\xA4 \\\"x\\\"", "%2e", "."};
+    std::string description;
+    for (std::size_t index = 0; index < std::size(names); ++index)
+        description += "[[adapter]]\nname = \"" + names[index] + "\"\npci_address = \"0" +
+                       std::to_string(index) +
+                       ":00.0\"\npci_id = \"1af4:1041\"\nmac = \"52:54:00:00:00:00\"\n";
+    const test::SimulatedAdapters adapters(description);
+    const utils::StringArray found = ma::enumerateAdapters();
+    ASSERT_EQ(std::size(names), found.size());
+    for (std::size_t index = 0; index < found.size(); ++index)
+        EXPECT_TRUE(install(found[index], test::madeRom({{PXE, static_cast<uint32_t>(index)}})).done);
+    for (std::size_t index = 0; index < found.size(); ++index)
+        EXPECT_EQ("IMG_PXE " + std::to_string(index), test::componentsOf(found[index]));
+    const auto folders = std::filesystem::directory_iterator(adapters.stateDirectory());
+    EXPECT_EQ(std::size(names), static_cast<std::size_t>(std::distance(begin(folders), end(folders))));
+}
+
+/// Looks at the progress from within every step of a write.
+class WatchedFiles : public ma::FlashFiles {
+  public:
+    void write(int descriptor, std::span<const uint8_t> bytes) override {
+        FlashFiles::write(descriptor, bytes);
+        // From another thread, and with a prepare in between: neither may disturb the write.
+        std::async(std::launch::async, [this] {
+            seen.push_back(watched->getFlashImageUpdateProgress("eth0"));
+        }).wait();
+        const Rom rom = test::madeRom({{PXE, 1}});
+        Rom output(rom.size());
+        auto size = static_cast<uint32_t>(rom.size());
+        std::vector<FirmwareType> types;
+        watched->prepareFlashImage("eth0", rom.data(), size, output.data(), &size, types);
+        uint32_t code = 0;
+        EXPECT_FALSE(watched->writeFlashImage("eth0", rom.data(), size, code, secondWrite));
+    }
+
+    ma::Simulator* watched = nullptr;
+    std::vector<uint16_t> seen;
+    std::string secondWrite;
+};
+
+TEST(Simulator, progressMovesOnlyForward) {
+    const test::TempFolder folder;
+    const auto files = std::make_shared<WatchedFiles>();
+    const auto simulator = std::make_shared<ma::Simulator>(
+        ma::parseAdapterDescriptions(test::TEST_ADAPTERS, ""), folder.path(), files);
+    files->watched = simulator.get();
+    const auto previous = ma::setBackend(simulator);
+    const test::PreparedImage prepared = test::prepareImage("eth0", test::realRom("pxe-virtio"));
+    EXPECT_EQ(0, ma::getFlashImageUpdateProgress("eth0"));
+    EXPECT_TRUE(test::writeImage("eth0", prepared.image).done);
+    EXPECT_EQ(100, ma::getFlashImageUpdateProgress("eth0"));
+    EXPECT_TRUE(std::is_sorted(files->seen.begin(), files->seen.end()));
+    EXPECT_LT(15, std::set<uint16_t>(files->seen.begin(), files->seen.end()).size());
+    EXPECT_EQ(99, files->seen.back()) << "100 only when it is in force";
+    EXPECT_EQ("adapter eth0 is being written to by this process (" + std::to_string(::getpid()) +
+                  "); wait until it is done",
+              files->secondWrite);
+
+    simulator->injectFault("eth0", {.percent = 50, .code = 1, .text = "worn out"});
+    EXPECT_EQ(0, test::prepareImage("eth0", test::realRom("pxe-virtio")).status);
+    EXPECT_EQ(0, ma::getFlashImageUpdateProgress("eth0"));
+    EXPECT_FALSE(test::writeImage("eth0", prepared.image).done);
+    const uint16_t reached = ma::getFlashImageUpdateProgress("eth0");
+    EXPECT_TRUE(reached >= 49 && reached < 60) << reached;
+    EXPECT_EQ(2, test::prepareImage("eth0", test::realRom("pxe-pcnet")).status);
+    EXPECT_EQ(0, ma::getFlashImageUpdateProgress("eth0"));
+    ma::setBackend(previous);
+}
+
+TEST(Simulator, portsAreUpdatedAndReadAtOnce) {
+    const test::SimulatedAdapters adapters;
+    constexpr uint16_t UPDATES = 8;
+    std::atomic<int> running = 3;
+    std::vector<std::thread> threads;
+    for (const auto& [name, device] : {std::pair("eth0", "virtio"), {"eth1", "virtio"}, {"eth2", "rtl8139"}})
+        threads.emplace_back(
+            [&running, name = std::string(name), rom = test::realRom("pxe-" + std::string(device))] {
+                for (uint16_t revision = 1; revision <= UPDATES; ++revision)
+                    EXPECT_TRUE(install(name, test::withRevision(rom, revision)).done);
+                --running;
+            });
+    for (int reader = 0; reader < 2; ++reader)
+        threads.emplace_back([&running] {
+            while (running > 0)
+                for (const std::string& name : ma::enumerateAdapters()) {
+                    EXPECT_GE(100, ma::getFlashImageUpdateProgress(name));
+                    EXPECT_FALSE(ma::getAdapterInfo(name).components.empty()) << "half an update was seen";
+                }
+        });
+    for (std::thread& thread : threads)
+        thread.join();
+    for (const char* name : {"eth0", "eth1", "eth2"})
+        EXPECT_EQ("IMG_PXE 8, IMG_UEFI 0", test::componentsOf(name));
+}
+
+TEST(Simulator, writeSpeedIsKept) {
+    std::string description = test::TEST_ADAPTERS;
+    description.insert(description.find("name ="), "write_speed = 20_480\n");
+    const test::SimulatedAdapters adapters(description);
+    const auto begin = std::chrono::steady_clock::now();
+    EXPECT_TRUE(install("eth0", test::madeRom({{PXE, 2}, {UEFI, 2}})).done);
+    EXPECT_LE(std::chrono::milliseconds(99), std::chrono::steady_clock::now() - begin);  // 2048 bytes
+}
+
+TEST(Backend, isChosenByCallThenEnvironment) {
+    const test::SimulatedAdapters adapters;
+    ::setenv("QUENX_ADAPTERS", adapters.descriptionFile().c_str(), 1);
+    ::setenv("QUENX_ADAPTER_STATE", adapters.stateDirectory().c_str(), 1);
+    const std::shared_ptr<ma::Backend> mine = ma::setBackend(nullptr);
+    EXPECT_EQ(&*adapters, mine.get());
+    EXPECT_EQ(5U, ma::enumerateAdapters().size());
+    EXPECT_TRUE(install("eth0", test::madeRom({{PXE, 8}})).done);
+    EXPECT_EQ("IMG_PXE 8, IMG_UEFI 0", test::describeRom(adapters->flashContent("eth0")))
+        << "the state is shared";
+
+    EXPECT_THROW(ma::configureSimulator(adapters.folder() / "none.toml", "x"), ma::AdapterError);
+    EXPECT_EQ(5U, ma::enumerateAdapters().size()) << "the old one stays";
+    adapters.folder().write("empty.toml", "");
+    ma::configureSimulator(adapters.folder() / "empty.toml", adapters.stateDirectory());
+    EXPECT_EQ(0U, ma::enumerateAdapters().size());
+
+    // A mistake is told at each call until it is mended.
+    ::setenv("QUENX_ADAPTERS", (adapters.folder() / "late.toml").c_str(), 1);
+    ma::setBackend(nullptr);
+    EXPECT_THROW(ma::enumerateAdapters(), ma::AdapterError);
+    adapters.folder().write("late.toml", test::TEST_ADAPTERS);
+    EXPECT_EQ(5U, ma::enumerateAdapters().size());
+    ::unsetenv("QUENX_ADAPTERS");
+    ::unsetenv("QUENX_ADAPTER_STATE");
+    ma::setBackend(mine);
+}
+
+}  // namespace

@@ -1,0 +1,222 @@
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <cctype>
+#include <map>
+#include <set>
+#include <sstream>
+
+#include "Framework/ClassDeclaration.h"
+#include "Providers/Schema/CIM_AffectedJobElement.h"
+#include "Providers/Schema/CIM_ConcreteJob.h"
+#include "Providers/Schema/CIM_Controller.h"
+#include "Providers/Schema/CIM_ElementCapabilities.h"
+#include "Providers/Schema/CIM_ElementConformsToProfile.h"
+#include "Providers/Schema/CIM_ElementSoftwareIdentity.h"
+#include "Providers/Schema/CIM_EthernetPort.h"
+#include "Providers/Schema/CIM_OwningJobElement.h"
+#include "Providers/Schema/CIM_PortController.h"
+#include "Providers/Schema/CIM_ReferencedProfile.h"
+#include "Providers/Schema/CIM_RegisteredProfile.h"
+#include "Providers/Schema/CIM_ServiceAffectsElement.h"
+#include "Providers/Schema/CIM_SoftwareIdentity.h"
+#include "Providers/Schema/CIM_SoftwareIdentityResource.h"
+#include "Providers/Schema/CIM_SoftwareInstallationService.h"
+#include "Providers/Schema/CIM_SoftwareInstallationServiceCapabilities.h"
+#include "Providers/Schema/SchemaTable.h"
+
+namespace {
+
+const core::CimClassInfo* const leaves[] = {
+    &CIM_ConcreteJob::classInfo,
+    &CIM_SoftwareInstallationService::classInfo,
+    &CIM_SoftwareInstallationServiceCapabilities::classInfo,
+    &CIM_ReferencedProfile::classInfo,
+    &CIM_RegisteredProfile::classInfo,
+    &CIM_AffectedJobElement::classInfo,
+    &CIM_OwningJobElement::classInfo,
+    &CIM_ServiceAffectsElement::classInfo,
+    &CIM_ElementCapabilities::classInfo,
+    &CIM_ElementConformsToProfile::classInfo,
+    &CIM_EthernetPort::classInfo,
+    &CIM_PortController::classInfo,
+    &CIM_SoftwareIdentity::classInfo,
+    &CIM_SoftwareIdentityResource::classInfo,
+    &CIM_ElementSoftwareIdentity::classInfo,
+};
+
+/// All classes, by name: the leaves and what is above them.
+std::map<std::string, const core::CimClassInfo*> allClasses() {
+    std::map<std::string, const core::CimClassInfo*> classes;
+    for (const core::CimClassInfo* info : leaves) {
+        for (; info != nullptr; info = info->superclass)
+            classes[info->name] = info;
+    }
+    return classes;
+}
+
+const SchemaRow& rowOf(const std::string& name) {
+    const auto& table = schemaTable();
+    return *std::find_if(table.begin(), table.end(), [&](const SchemaRow& row) { return name == row.name; });
+}
+
+std::string nameIn(const std::string& word) {
+    const std::size_t start = word[0] == '+' ? 1 : 0;
+    return word.substr(start, word.find(':') - start);
+}
+
+/// The words of a row, with ... written out.
+std::vector<std::string> wordsOf(const SchemaRow& row) {
+    std::istringstream text(row.properties);
+    std::vector<std::string> words;
+    std::set<std::string> names;
+    for (std::string word; text >> word;) {
+        if (word != "...") {
+            words.push_back(word);
+            names.insert(nameIn(word));
+            continue;
+        }
+        for (const std::string& repeated : wordsOf(rowOf(row.superclass))) {
+            if (!names.contains(nameIn(repeated)))
+                words.push_back(repeated.substr(repeated[0] == '+' ? 1 : 0));
+        }
+    }
+    return words;
+}
+
+/// As wordsOf(), without the marks, for the whole chain: the root's members first.
+std::vector<std::string> membersOfChain(const SchemaRow& row) {
+    std::vector<std::string> members;
+    if (*row.superclass != '\0') members = membersOfChain(rowOf(row.superclass));
+    for (const std::string& word : wordsOf(row))
+        members.push_back(word.substr(word[0] == '+' ? 1 : 0));
+    return members;
+}
+
+std::vector<std::string> declaredIn(const SchemaRow& row) {
+    std::vector<std::string> declared;
+    for (const std::string& word : wordsOf(row)) {
+        if (word[0] == '+') declared.push_back(word.substr(1));
+    }
+    return declared;
+}
+
+/// A property as a word of the table.
+std::string wordOf(const std::string& name, core::CimType type, bool isArray, bool isKey,
+                   const std::string& referenceClass) {
+    std::string kind(core::typeName(type));
+    kind[0] = static_cast<char>(std::toupper(kind[0]));
+    if (type == core::CimType::Reference) kind = ">" + referenceClass;
+    return name + ":" + kind + (isArray ? "_arr" : "") + (isKey ? "*" : "");
+}
+
+std::string wordOf(core::CimProperty& property) {
+    const char* const referenceClass = property.getReferenceClass();
+    return wordOf(property.getName(), property.getType(), property.isArray(), property.isKey(),
+                  referenceClass == nullptr ? "" : referenceClass);
+}
+
+TEST(Schema, HasTheClassesOfTheTable) {
+    const auto classes = allClasses();
+    EXPECT_EQ(classes.size(), schemaTable().size());
+    for (const SchemaRow& row : schemaTable()) {
+        SCOPED_TRACE(row.name);
+        ASSERT_TRUE(classes.contains(row.name));
+        const core::CimClassInfo& info = *classes.at(row.name);
+        EXPECT_STREQ(info.superclass == nullptr ? "" : info.superclass->name, row.superclass);
+        EXPECT_EQ(info.isAssociation, std::string(row.properties).find(":>") != std::string::npos);
+    }
+}
+
+TEST(Schema, MembersStandInOrderWithKindAndKey) {
+    for (const auto& [name, info] : allClasses()) {
+        SCOPED_TRACE(name);
+        const std::unique_ptr<core::CimInstance> instance = info->makeSample();
+        std::vector<std::string> members;
+        for (core::CimProperty* property : instance->getAllProperties()) {
+            members.push_back(wordOf(*property));
+            EXPECT_TRUE(property->IsNull()) << property->getName();
+        }
+        EXPECT_EQ(members, membersOfChain(rowOf(name)));
+        EXPECT_EQ(instance->getClassName(), name);
+    }
+}
+
+TEST(Schema, ServesTheMembersOfTheMostDerivedClass) {
+    for (const auto& [name, info] : allClasses()) {
+        SCOPED_TRACE(name);
+        const std::unique_ptr<core::CimInstance> instance = info->makeSample();
+        const auto& all = instance->getAllProperties();
+        const std::size_t own = wordsOf(rowOf(name)).size();
+        ASSERT_GE(all.size(), own);
+        for (std::size_t i = all.size() - own; i < all.size(); i++) {
+            EXPECT_EQ(instance->getPropertyByName(all[i]->getName()), all[i]) << all[i]->getName();
+        }
+        EXPECT_EQ(instance->getProperties().size(), own);
+    }
+}
+
+TEST(Schema, DeclaresWhatAClassAddsOrMakesAKey) {
+    for (const auto& [name, info] : allClasses()) {
+        SCOPED_TRACE(name);
+        const core::ClassChain chain = core::declarationsOf(*info);
+        ASSERT_FALSE(chain.empty());
+        std::vector<std::string> declared;
+        for (const core::PropertyDeclaration& property : chain.front()->properties) {
+            declared.push_back(wordOf(property.name, property.type, property.isArray, property.isKey,
+                                      property.referenceClass));
+        }
+        EXPECT_EQ(declared, declaredIn(rowOf(name)));
+    }
+}
+
+TEST(Schema, DeclaresTheMethodsOfTheService) {
+    std::string text;
+    const core::ClassChain chain = core::declarationsOf(CIM_SoftwareInstallationService::classInfo);
+    for (const core::MethodDeclaration& method : chain.front()->methods) {
+        text += std::string(core::typeName(method.returnType)) + " " + method.name + "\n";
+        for (const core::ParameterDeclaration& parameter : method.parameters) {
+            const bool isReference = parameter.type == core::CimType::Reference;
+            text += parameter.direction == core::CimDirection::In ? "  in" : "  out";
+            text += parameter.optional ? " optional " : " ";
+            text += isReference ? parameter.referenceClass : core::typeName(parameter.type);
+            text += (parameter.isArray ? "[] " : " ") + parameter.name + "\n";
+        }
+    }
+    EXPECT_EQ(text,
+              "uint32 CheckSoftwareIdentity\n"
+              "  in CIM_SoftwareIdentity Source\n"
+              "  in optional CIM_ManagedElement Target\n"
+              "  in optional CIM_Collection Collection\n"
+              "  out uint16[] InstallCharacteristics\n"
+              "uint32 InstallFromSoftwareIdentity\n"
+              "  out CIM_ConcreteJob Job\n"
+              "  in uint16[] InstallOptions\n"
+              "  in optional string[] InstallOptionsValues\n"
+              "  in CIM_SoftwareIdentity Source\n"
+              "  in optional CIM_ManagedElement Target\n"
+              "  in optional CIM_Collection Collection\n"
+              "uint32 InstallFromURI\n"
+              "  out CIM_ConcreteJob Job\n"
+              "  in string URI\n"
+              "  in CIM_ManagedElement Target\n"
+              "  in uint16[] InstallOptions\n"
+              "  in optional string[] InstallOptionsValues\n");
+}
+
+TEST(Schema, ReferencesAreTypedAcrossLibraries) {
+    CIM_ConcreteJob job;
+    job.InstanceID = std::string("Quenx:1");
+    EXPECT_TRUE(job.CIM_Job::InstanceID.IsNull()) << "only the most derived one is set";
+
+    CIM_AffectedJobElement association;
+    auto* reference =
+        dynamic_cast<core::CimPropertyRefT<CIM_Job>*>(association.getPropertyByName("AffectingElement"));
+    ASSERT_NE(reference, nullptr);
+    *reference = &job;
+    EXPECT_EQ(association.AffectingElement.toString(), "CIM_ConcreteJob.InstanceID=\"Quenx:1\"");
+    *reference = nullptr;
+    EXPECT_TRUE(association.AffectingElement.IsNull());
+}
+
+}  // namespace

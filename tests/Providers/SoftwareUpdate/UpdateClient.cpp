@@ -1,0 +1,94 @@
+#include "Providers/SoftwareUpdate/UpdateClient.h"
+
+#include <chrono>
+#include <thread>
+
+namespace test {
+
+using core::Argument;
+using core::CimScalar;
+using core::CimType;
+using core::CimValue;
+
+core::CimPath UpdateClient::pathNamed(const std::string& className, const std::string& name) const {
+    for (const core::InstanceValue& instance : m_requests.enumerateInstances(className)) {
+        if (text(instance, "Name") == name) return instance.path;
+    }
+    ADD_FAILURE() << "no " << className << " is named " << name;
+    return {};
+}
+
+CallResult UpdateClient::call(const std::string& method, const std::vector<Argument>& arguments) const {
+    CallResult result;
+    try {
+        const core::MethodResult answer = m_requests.invokeMethod(service(), method, arguments);
+        result.returnValue = answer.returnValue;
+        for (const Argument& output : answer.outputs) {
+            if (output.name == "Job") result.job = std::get<core::CimPath>(*output.value.scalar());
+            if (output.name != "InstallCharacteristics") continue;
+            for (const CimScalar& code : *output.value.elements()) {
+                result.characteristics.push_back(static_cast<unsigned short>(std::get<std::uint64_t>(code)));
+            }
+        }
+    } catch (const core::CimError& error) {
+        result.error = error.what();
+    }
+    return result;
+}
+
+CallResult UpdateClient::install(const std::string& uri, const std::string& adapter,
+                                 std::vector<unsigned short> options, std::vector<std::string> values) const {
+    return call("InstallFromURI",
+                {textArgument("URI", uri), pathArgument("Target", port(adapter)),
+                 codesArgument("InstallOptions", options), textsArgument("InstallOptionsValues", values)});
+}
+
+core::InstanceValue UpdateClient::waitForEnd(const core::CimPath& job) const {
+    const auto deadline = std::chrono::steady_clock::now() + std::chrono::seconds(60);
+    while (true) {
+        core::InstanceValue value = m_requests.getInstance(job);
+        if (hasEnded(value)) return value;
+        if (std::chrono::steady_clock::now() > deadline) {
+            ADD_FAILURE() << job.toString() << " does not end; it is in state " << state(value);
+            return value;
+        }
+        std::this_thread::sleep_for(std::chrono::milliseconds(2));
+    }
+}
+
+bool UpdateClient::hasEnded(const core::InstanceValue& job) {
+    constexpr unsigned completed = 7;
+    constexpr unsigned exception = 10;
+    return state(job) == completed || state(job) == exception;
+}
+
+unsigned UpdateClient::number(const core::InstanceValue& instance, const char* property) {
+    return static_cast<unsigned>(std::get<std::uint64_t>(*instance.find(property)->value.scalar()));
+}
+
+std::string UpdateClient::text(const core::InstanceValue& instance, const char* property) {
+    const core::PropertyValue* found = instance.find(property);
+    if (found == nullptr || found->value.isNull()) return {};
+    return core::scalarText(found->value.type, *found->value.scalar());
+}
+
+Argument pathArgument(const char* name, const core::CimPath& path) {
+    return {name, CimValue::of(CimType::Reference, CimScalar(path))};
+}
+
+Argument textArgument(const char* name, const std::string& text) {
+    return {name, CimValue::of(CimType::String, CimScalar(text))};
+}
+
+Argument codesArgument(const char* name, const std::vector<unsigned short>& codes) {
+    std::vector<CimScalar> values;
+    for (const unsigned short code : codes)
+        values.emplace_back(std::uint64_t{code});
+    return {name, CimValue::arrayOf(CimType::Uint16, std::move(values))};
+}
+
+Argument textsArgument(const char* name, const std::vector<std::string>& texts) {
+    return {name, CimValue::arrayOf(CimType::String, {texts.begin(), texts.end()})};
+}
+
+}  // namespace test

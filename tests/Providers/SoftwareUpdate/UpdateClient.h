@@ -1,0 +1,54 @@
+#pragma once
+
+#include <gtest/gtest.h>
+
+#include <optional>
+#include <string>
+#include <vector>
+
+#include "Framework/CimRequests.h"
+
+namespace test {
+
+/// What a call of a method came to.
+struct CallResult {
+    unsigned int returnValue = 0;
+    std::string error;  ///< the text of the CIM error; the return value means nothing then
+    std::optional<core::CimPath> job;
+    std::vector<unsigned short> characteristics;
+};
+
+/// A client of the providers that this process serves: speaks through the request layer only, and so needs
+/// nothing of the providers' own code. Thread-safe.
+class UpdateClient {
+  public:
+    /// "Quenx_EthernetPort" or another class, by its Name.
+    core::CimPath pathNamed(const std::string& className, const std::string& name) const;
+    core::CimPath port(const std::string& adapter) const { return pathNamed("Quenx_EthernetPort", adapter); }
+    core::CimPath service() const {
+        return m_requests.enumerateInstanceNames("Quenx_SoftwareInstallationService").at(0);
+    }
+
+    CallResult call(const std::string& method, const std::vector<core::Argument>& arguments) const;
+    /// InstallFromURI with options, by default {5}, on a port.
+    CallResult install(const std::string& uri, const std::string& adapter,
+                       std::vector<unsigned short> options = {5}, std::vector<std::string> values = {}) const;
+
+    /// Follows the job to its end; fails the test when it takes too long.
+    core::InstanceValue waitForEnd(const core::CimPath& job) const;
+
+    static unsigned state(const core::InstanceValue& job) { return number(job, "JobState"); }
+    static bool hasEnded(const core::InstanceValue& job);
+    static unsigned number(const core::InstanceValue& instance, const char* property);
+    static std::string text(const core::InstanceValue& instance, const char* property);
+
+    core::CimRequests m_requests{"root/cimv2"};
+};
+
+// Arguments of methods.
+core::Argument pathArgument(const char* name, const core::CimPath& path);
+core::Argument textArgument(const char* name, const std::string& text);
+core::Argument codesArgument(const char* name, const std::vector<unsigned short>& codes);
+core::Argument textsArgument(const char* name, const std::vector<std::string>& texts);
+
+}  // namespace test

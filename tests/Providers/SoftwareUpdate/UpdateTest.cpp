@@ -1,0 +1,43 @@
+#include "Providers/SoftwareUpdate/UpdateTest.h"
+
+#include <algorithm>
+
+#include "Support/TestRoms.h"
+
+namespace test {
+
+UpdateTest::UpdateTest()
+    : m_config(m_folder.write("quenx.conf", "FWFilePath=" + m_folder.path() + "\n")),
+      m_locker(std::in_place),
+      m_backend(std::make_shared<HookedBackend>(ma::setBackend(nullptr))),
+      m_inventory(QUENX_INVENTORY_LIBRARY) {
+    ma::setBackend(m_backend);
+    m_agent = std::make_unique<core::SoftwareUpdateAgent>();
+    Quenx_ConcreteJob::m_servicedAdapter = std::string();
+}
+
+UpdateTest::~UpdateTest() {
+    m_agent.reset();
+}
+
+void UpdateTest::expectUpdateWorks() const {
+    const CallResult result = install(goodImage(), "eth0");
+    ASSERT_EQ(result.returnValue, 4096U) << result.error;
+    EXPECT_EQ(state(waitForEnd(*result.job)), JobStateCompleted);
+    EXPECT_EQ(claim(), "");
+}
+
+std::string UpdateTest::file(const std::string& name, const std::vector<uint8_t>& content) const {
+    return "file://" + m_folder.write(name, std::span(content));
+}
+
+std::string UpdateTest::goodImage() const {
+    return file("good.rom", madeRom({{utils::FirmwareType::PXE, 2}, {utils::FirmwareType::UEFI, 1}}));
+}
+
+bool UpdateTest::logged(const std::string& message) {
+    const auto lines = SyslogCapture::messages();
+    return std::find(lines.begin(), lines.end(), message) != lines.end();
+}
+
+}  // namespace test

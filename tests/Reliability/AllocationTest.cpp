@@ -1,0 +1,111 @@
+// Memory runs out at the n-th allocation of an update, for every n.
+#include <thread>
+
+#include "Framework/Retirement.h"
+#include "Providers/SoftwareUpdate/UpdateTest.h"
+#include "Reliability/AllocationFaults.h"
+#include "Reliability/Effort.h"
+#include "Support/TestRoms.h"
+
+namespace {
+
+using On = test::AllocationFailure::On;
+using test::CallResult;
+
+constexpr unsigned kJobStarted = 4096;
+
+class AllocationTest : public test::UpdateTest {
+  protected:
+    /// One update, with the n-th allocation failing. False when it was never reached.
+    bool failAt(On on, std::uint64_t n, bool releases);
+    void checkClaim(const CallResult& result, bool releases);
+    void deleteJobs() {
+        for (const core::CimPath& job : m_requests.enumerateInstanceNames("Quenx_ConcreteJob")) {
+            waitForEnd(job);
+            m_requests.deleteInstance(job);
+        }
+        core::drainRetired();
+    }
+    void failEverywhere(On on, std::uint64_t step, bool releases);
+
+    const std::string m_image = goodImage();
+    const std::string m_old = test::describeRom(m_adapters->flashContent("eth0"));
+    const core::CimPath m_service = service();
+    const std::vector<core::Argument> m_arguments = {
+        test::textArgument("URI", m_image), test::pathArgument("Target", port("eth0")),
+        test::codesArgument("InstallOptions", {5, 32768}),
+        test::textsArgument("InstallOptionsValues", {"", "IMG_PXE+IMG_UEFI"})};
+};
+
+void AllocationTest::checkClaim(const CallResult& result, bool releases) {
+    if (claim().empty()) return;
+    // Kept by a failure that is no refusal, and by nothing else.
+    EXPECT_FALSE(releases);
+    EXPECT_EQ(claim(), "eth0");
+    EXPECT_TRUE(result.returnValue == 2U || !result.error.empty()) << result.returnValue;
+    EXPECT_EQ(call("InstallFromURI", m_arguments).returnValue, 6U);
+    Quenx_ConcreteJob::m_servicedAdapter = std::string();
+}
+
+bool AllocationTest::failAt(On on, std::uint64_t n, bool releases) {
+    CallResult result;
+    bool struck = false;
+    {
+        const test::AllocationFailure failure(on, n);
+        try {
+            result.returnValue =
+                m_requests.invokeMethod(m_service, "InstallFromURI", m_arguments).returnValue;
+        } catch (const std::exception& error) {
+            result.error = error.what();
+        }
+        // A worker that was started goes on, whatever its request came to.
+        while (on == On::OtherThreads && !claim().empty())
+            std::this_thread::yield();
+        struck = failure.hasStruck();
+    }
+    deleteJobs();
+    checkClaim(result, releases);
+    const std::string flash = test::describeRom(m_adapters->flashContent("eth0"));
+    EXPECT_TRUE(flash == "IMG_PXE 2, IMG_UEFI 1" || flash == m_old) << flash;
+    EXPECT_TRUE(struck || result.returnValue == kJobStarted) << result.error;
+    return struck;
+}
+
+void AllocationTest::failEverywhere(On on, std::uint64_t step, bool releases) {
+    // What is built once and kept, exists from here on.
+    m_config.initialize();
+    for (int i = 0; i < 2; ++i)
+        failAt(on, 1U << 30, releases);
+    const std::int64_t before = test::liveBytes();
+    std::uint64_t n = 1;
+    for (; failAt(on, n, releases); n += step)
+        ASSERT_FALSE(HasFailure()) << "at allocation " << n;
+    EXPECT_GT(n, on == On::ThisThread ? 200U : 20U);
+    EXPECT_EQ(test::liveBytes(), before);
+    test::count("allocations failed", (n - 1) / step);
+    expectUpdateWorks();
+}
+
+TEST_F(AllocationTest, FailingInTheRequest) {
+    const test::LogLevelGuard silent(0);
+    for (const bool releases : {false, true}) {
+        SCOPED_TRACE(releases);
+        m_folder.write("quenx.conf", releases ? "ReleaseClaimAfterCheck=1\n" : "\n");
+        failEverywhere(On::ThisThread, 1, releases);
+    }
+}
+
+TEST_F(AllocationTest, FailingInTheWorker) {
+    const test::LogLevelGuard silent(0);
+    failEverywhere(On::OtherThreads, 1, false);
+}
+
+TEST_F(AllocationTest, FailingWhileEverythingIsLogged) {
+    // Destructors that log, and refusals on their way, must survive it.
+    test::SyslogCapture::keep(false);
+    failEverywhere(On::ThisThread, test::effort().everything ? 1 : 23, false);
+    failEverywhere(On::OtherThreads, test::effort().everything ? 1 : 5, false);
+    test::SyslogCapture::keep(true);
+}
+
+}  // namespace

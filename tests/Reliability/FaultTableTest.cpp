@@ -1,0 +1,180 @@
+// Every call that an update makes fails, throws or stalls, one at a time.
+#include <thread>
+
+#include "Framework/Retirement.h"
+#include "Providers/SoftwareUpdate/UpdateTest.h"
+#include "Reliability/Effort.h"
+#include "Reliability/ThreadRefusal.h"
+#include "Support/TestRoms.h"
+
+namespace {
+
+using ma::Fault;
+using test::CallResult;
+using utils::FirmwareType;
+
+constexpr unsigned kFailed = 4;
+constexpr unsigned kJobStarted = 4096;
+
+/// Whose call is struck.
+enum class On { Request, Worker };
+enum class How { Throw, Stall };
+
+class FaultTableTest : public test::UpdateTest {
+  protected:
+    /// What an update on eth4, whose iSCSI image is not renewed, comes to: so every call is made.
+    struct Row {
+        std::string name;
+        std::function<void(FaultTableTest&)> arm;
+        unsigned returnValue;
+        unsigned jobState = 0;  ///< with a job only
+        unsigned errorCode = 0;
+        std::string errorText{};
+        bool keepsClaim = false;  ///< without ReleaseClaimAfterCheck
+    };
+
+    static std::vector<Row> table();
+
+    /// Throws at, or holds up, one operation of the adapter API.
+    static std::function<void(FaultTableTest&)> strike(const std::string& operation, On on, How how);
+    static std::function<void(FaultTableTest&)> order(ma::Operation at, Fault::Action action,
+                                                      uint16_t percent = 0) {
+        return [=](FaultTableTest& test) {
+            test.m_adapters->injectFault("eth4", Fault{at, action, percent, 17, "on order"});
+        };
+    }
+
+    void run(const Row& row, bool releases);
+    void disarm();
+    std::string components() const { return test::describeRom(m_adapters->flashContent("eth4")); }
+    CallResult installOnEth4(const std::string& uri) const {
+        return call("InstallFromURI", {test::textArgument("URI", uri), test::pathArgument("Target", m_port),
+                                       test::codesArgument("InstallOptions", {32768, 5}),
+                                       test::textsArgument("InstallOptionsValues", {"IMG_UEFI"})});
+    }
+
+    const core::CimPath m_port = port("eth4");
+    std::atomic<int> m_struck{0};
+    std::optional<test::ThreadRefusal> m_noThreads;
+    uint16_t m_revision = 1;
+};
+
+std::function<void(FaultTableTest&)> FaultTableTest::strike(const std::string& operation, On on, How how) {
+    return [=](FaultTableTest& test) {
+        test.m_struck = 0;
+        const bool isProgress = operation == "getFlashImageUpdateProgress";
+        test.m_backend->hook = [&test, operation, on, how, isProgress, request = std::this_thread::get_id()](
+                                   const std::string& called, const std::string&) {
+            // The worker gives the request the time to ask.
+            for (int i = 0; isProgress && called == "writeFlashImage" && test.m_struck == 0 && i < 5000; ++i)
+                utils::Thread::msleep(1);
+            const bool isRequest = std::this_thread::get_id() == request;
+            if (called != operation || isRequest != (on == On::Request)) return;
+            ++test.m_struck;
+            if (how == How::Throw) throw std::runtime_error(operation);
+            utils::Thread::msleep(30);
+        };
+    };
+}
+
+std::vector<FaultTableTest::Row> FaultTableTest::table() {
+    using Operation = ma::Operation;
+    using Action = Fault::Action;
+    const std::string timeout = "Timeout Error";
+    std::vector<Row> rows = {
+        // New: the image is being verified.
+        {"target look-up", strike("enumerateAdapters", On::Request, How::Throw), 5},
+        {"preparation throws", strike("prepareFlashImage", On::Request, How::Throw), 2, 0, 0, "", true},
+        {"preparation stalls", strike("prepareFlashImage", On::Request, How::Stall), kJobStarted, 7},
+        {"preparation fails", [](FaultTableTest& test) { test.m_backend->prepareStatus = 6; }, 2},
+        // Starting.
+        {"no thread", [](FaultTableTest& test) { test.m_noThreads.emplace(); }, kFailed},
+        // Running.
+        {"no locker", [](FaultTableTest& test) { test.m_locker.reset(); }, kJobStarted, 10, 4, timeout},
+        {"version fails", order(Operation::FirmwareVersion, Action::Fail), kJobStarted, 7},
+        {"boot type fails", order(Operation::BootType, Action::Fail), kJobStarted, 7},
+        {"write fails at once", order(Operation::Write, Action::Fail), kJobStarted, 10, 17, "on order"},
+        {"write fails late", order(Operation::Write, Action::Fail, 90), kJobStarted, 10, 17, "on order"},
+        {"write throws late", order(Operation::Write, Action::Throw, 50), kJobStarted, 10, 4, timeout},
+        {"write loses power", order(Operation::Write, Action::PowerLoss, 50), kJobStarted, 10, 4, timeout},
+        {"word fails", order(Operation::CapabilityWord, Action::Fail), kJobStarted, 10, 17, "on order"},
+        {"progress throws", strike("getFlashImageUpdateProgress", On::Request, How::Throw), kJobStarted, 7},
+        {"progress stalls", strike("getFlashImageUpdateProgress", On::Request, How::Stall), kJobStarted, 7},
+    };
+    for (const char* operation : {"getAdapterFirmwareVersion", "getPCIAddress", "enumerateAdapters",
+                                  "setBootType", "writeFlashImage", "updateCapabilityWord"}) {
+        rows.push_back({std::string(operation) + " throws", strike(operation, On::Worker, How::Throw),
+                        kJobStarted, 10, 4, timeout});
+        rows.push_back(
+            {std::string(operation) + " stalls", strike(operation, On::Worker, How::Stall), kJobStarted, 7});
+    }
+    return rows;
+}
+
+void FaultTableTest::disarm() {
+    m_backend->hook = nullptr;
+    m_backend->prepareStatus.reset();
+    m_adapters->clearFaults("eth4");
+    m_noThreads.reset();
+    if (!m_locker) m_locker.emplace();
+}
+
+void FaultTableTest::run(const Row& row, bool releases) {
+    const std::string before = components();
+    const std::string uri =
+        file("update.rom",
+             test::madeRom({{FirmwareType::iSCSI, 1}, {FirmwareType::UEFI, ++m_revision}}, 0x15ad, 0x07b0));
+    m_struck = -1;
+    row.arm(*this);
+    const CallResult result = installOnEth4(uri);
+    EXPECT_EQ(result.returnValue, row.returnValue) << result.error;
+    EXPECT_EQ(result.job.has_value(), row.returnValue == kJobStarted);
+    if (result.job) {
+        const core::InstanceValue job = waitForEnd(*result.job);
+        EXPECT_EQ(state(job), row.jobState);
+        EXPECT_EQ(number(job, "ErrorCode"), row.errorCode);
+        EXPECT_EQ(text(job, "ErrorDescription"), row.errorText);
+        EXPECT_EQ(number(job, "PercentComplete"), 100U);
+    }
+    EXPECT_NE(m_struck, 0) << "the fault was never reached";
+    disarm();
+    // Whole, and new where the flash was written to its end.
+    const std::string updated = "IMG_iSCSI 1, IMG_UEFI " + std::to_string(m_revision);
+    const std::string after = components();
+    EXPECT_TRUE(after == updated || (row.jobState != 7 && after == before)) << after;
+
+    const bool kept = row.keepsClaim && !releases;
+    EXPECT_EQ(claim(), kept ? "eth4" : "");
+    if (kept) {
+        EXPECT_EQ(installOnEth4(uri).returnValue, 6U);
+        EXPECT_EQ(install(goodImage(), "eth0").returnValue, 2U);
+        Quenx_ConcreteJob::m_servicedAdapter = std::string();
+    }
+    const CallResult next = installOnEth4(uri);
+    ASSERT_EQ(next.returnValue, kJobStarted) << next.error;
+    EXPECT_EQ(state(waitForEnd(*next.job)), 7U);
+    EXPECT_EQ(components(), updated);
+    test::count("faults injected");
+}
+
+TEST_F(FaultTableTest, EveryFaultEndsAsDocumentedAndTheNextUpdateWorks) {
+    for (const bool releases : {false, true}) {
+        m_folder.write("quenx.conf", releases ? "ReleaseClaimAfterCheck=1\n" : "ReleaseClaimAfterCheck=0\n");
+        for (const Row& row : table()) {
+            SCOPED_TRACE(row.name + (releases ? ", claim given back" : ", claim kept"));
+            run(row, releases);
+        }
+    }
+}
+
+TEST_F(FaultTableTest, WithoutAnyThreadTheJobIsGoneAllTheSame) {
+    // A thread that buries jobs may be there from an earlier test; then it does so.
+    const test::ThreadRefusal noThreads;
+    EXPECT_EQ(install(goodImage(), "eth0").returnValue, kFailed);
+    EXPECT_GE(test::ThreadRefusal::count(), 1);
+    EXPECT_TRUE(m_requests.enumerateInstances("Quenx_ConcreteJob").empty());
+    EXPECT_TRUE(test::SyslogCapture::contains("Thread start error"));
+    EXPECT_EQ(claim(), "");
+}
+
+}  // namespace

@@ -1,0 +1,286 @@
+// Many clients at once, while adapters are being written to.
+#include <algorithm>
+#include <mutex>
+#include <random>
+#include <thread>
+
+#include "Framework/InstanceRange.h"
+#include "Framework/RequestScope.h"
+#include "Framework/Retirement.h"
+#include "Providers/SoftwareUpdate/JobThread.h"
+#include "Providers/SoftwareUpdate/UpdateTest.h"
+#include "Reliability/AllocationFaults.h"
+#include "Reliability/Effort.h"
+#include "Support/TestRoms.h"
+
+namespace {
+
+using core::CimPath;
+using test::CallResult;
+using utils::FirmwareType;
+using Clock = std::chrono::steady_clock;
+
+/// Knows how many adapters are being written to at once, and takes its time for it.
+class WatchingBackend : public test::HookedBackend {
+  public:
+    using HookedBackend::HookedBackend;
+
+    bool writeFlashImage(const std::string& adapter, const uint8_t* image, uint32_t imageSize,
+                         uint32_t& errorCode, std::string& errorText) override {
+        const int writing = ++m_writing;
+        for (int most = mostWriting; writing > most && !mostWriting.compare_exchange_weak(most, writing);) {
+        }
+        utils::Thread::msleep(static_cast<unsigned>(writes++ % 4));
+        const bool done = HookedBackend::writeFlashImage(adapter, image, imageSize, errorCode, errorText);
+        --m_writing;
+        return done;
+    }
+
+    std::atomic<int> mostWriting{0};
+    std::atomic<int> writes{0};
+
+  private:
+    std::atomic<int> m_writing{0};
+};
+
+class StressTest : public test::UpdateTest {
+  protected:
+    StressTest();
+    ~StressTest() override { ma::setBackend(m_backend); }
+
+    /// Lets the clients work for that long, and until that many jobs were created.
+    void run(std::chrono::milliseconds time, std::uint64_t jobs);
+    void deleteEverything();
+    std::uint64_t started() const { return m_started; }
+
+    const std::shared_ptr<WatchingBackend> m_watching = std::make_shared<WatchingBackend>(m_backend);
+    std::atomic<std::uint64_t> m_requestCount{0};
+    std::atomic<std::uint64_t> m_started{0};
+    std::atomic<std::uint64_t> m_refused{0};
+    std::atomic<std::uint64_t> m_checked{0};
+    std::atomic<std::uint64_t> m_deleted{0};
+
+  private:
+    using Random = std::minstd_rand;
+
+    void client(unsigned seed);
+    void act(Random& random);
+    template <class Items>
+    static auto& pick(const Items& items, Random& random) {
+        return items[random() % items.size()];
+    }
+    /// Some path of the model; none where the class has no instances.
+    std::optional<CimPath> pickPath(Random& random) const;
+    void walk(Random& random) const;
+    void startInstall(Random& random);
+    void check(Random& random);
+    void deleteSome(Random& random);
+
+    struct Target {
+        const char* adapter;
+        std::string uri;
+        CimPath port;
+    };
+
+    const test::LogLevelGuard m_silent{0};
+    std::vector<Target> m_targets;
+    std::vector<std::string> m_classes;
+    CimPath m_service;
+    std::atomic<bool> m_stop{false};
+};
+
+StressTest::StressTest() {
+    const std::string uri = goodImage();
+    m_targets = {
+        {"eth0", uri, port("eth0")},
+        {"eth1", uri, port("eth1")},
+        {"eth2",
+         file("rtl.rom", test::madeRom({{FirmwareType::PXE, 1}, {FirmwareType::UEFI, 1}}, 0x10ec, 0x8139)),
+         port("eth2")},
+        {"eth4",
+         file("vmx.rom", test::madeRom({{FirmwareType::iSCSI, 1}, {FirmwareType::UEFI, 0}}, 0x15ad, 0x07b0)),
+         port("eth4")},
+    };
+    m_service = service();
+    for (const core::ClassDeclaration& declaration : m_requests.enumerateClasses("", true))
+        m_classes.push_back(declaration.name);
+    ma::setBackend(m_watching);
+}
+
+std::optional<CimPath> StressTest::pickPath(Random& random) const {
+    const auto paths = m_requests.enumerateInstanceNames(pick(m_classes, random));
+    if (paths.empty()) return std::nullopt;
+    return pick(paths, random);
+}
+
+void StressTest::walk(Random& random) const {
+    const std::optional<CimPath> path = pickPath(random);
+    if (!path) return;
+    m_requests.associators(*path, {});
+    m_requests.referenceNames(*path, {});
+    m_requests.references(*path, {pick(m_classes, random), "", "", ""});
+}
+
+void StressTest::startInstall(Random& random) {
+    const Target& target = pick(m_targets, random);
+    const CallResult result = call(
+        "InstallFromURI",
+        {test::textArgument("URI", target.uri), test::pathArgument("Target", target.port),
+         test::codesArgument("InstallOptions", {5, 3}), test::textsArgument("InstallOptionsValues", {})});
+    EXPECT_EQ(result.error, "");
+    if (result.job) {
+        ++m_started;
+        if (random() % 4 == 0) m_requests.deleteInstance(*result.job);  // just started
+        if (random() % 4 == 1) m_requests.getInstance(*result.job);
+        return;
+    }
+    // In use, or another one is.
+    EXPECT_TRUE(result.returnValue == 6U || result.returnValue == 2U) << result.returnValue;
+    ++m_refused;
+}
+
+void StressTest::check(Random& random) {
+    const auto sources = m_requests.enumerateInstanceNames("Quenx_SoftwareIdentity");
+    if (sources.empty()) return;
+    const CallResult result = call("CheckSoftwareIdentity",
+                                   {test::pathArgument("Source", pick(sources, random)),
+                                    test::pathArgument("Target", pick(m_targets, random).port),
+                                    {"Collection", core::CimValue::null(core::CimType::Reference, false)}});
+    EXPECT_EQ(result.error, "");
+    if (result.returnValue == 0) ++m_checked;
+}
+
+void StressTest::deleteSome(Random& random) {
+    const auto jobs = m_requests.enumerateInstanceNames("Quenx_ConcreteJob");
+    if (jobs.size() < random() % 8) return;
+    for (const CimPath& job : jobs) {
+        if (random() % 2 == 0) continue;
+        m_requests.deleteInstance(job);
+        ++m_deleted;
+    }
+}
+
+void StressTest::act(Random& random) {
+    ++m_requestCount;
+    switch (random() % 8) {
+        case 0:
+            m_requests.enumerateInstances(pick(m_classes, random));
+            break;
+        case 1:
+            walk(random);
+            break;
+        case 2:
+            if (const auto path = pickPath(random)) m_requests.getInstance(*path);
+            break;
+        case 3:
+            check(random);
+            break;
+        case 4:
+            deleteSome(random);
+            break;
+        case 5:
+            EXPECT_FALSE(utils::isDebugLogged());
+            EXPECT_EQ(utils::logLevel, 0);
+            break;
+        default:
+            startInstall(random);
+    }
+}
+
+void StressTest::client(unsigned seed) {
+    Random random(seed);
+    while (!m_stop) {
+        try {
+            act(random);
+        } catch (const core::CimError& error) {
+            // Another client deleted it meanwhile.
+            EXPECT_EQ(error.status(), core::CimStatus::NotFound) << error.what();
+        }
+    }
+}
+
+void StressTest::run(std::chrono::milliseconds time, std::uint64_t jobs) {
+    constexpr unsigned clients = 6;
+    const std::uint64_t before = m_started;
+    const auto begin = Clock::now();
+    m_stop = false;
+    std::vector<std::thread> threads;
+    for (unsigned i = 0; i < clients; ++i)
+        threads.emplace_back([this, i] { client(i + 1); });
+    const auto limit = begin + std::max<Clock::duration>(time * 20, std::chrono::minutes(1));
+    while (Clock::now() < begin + time || (m_started - before < jobs && Clock::now() < limit))
+        utils::Thread::msleep(5);
+    m_stop = true;
+    for (std::thread& thread : threads)
+        thread.join();
+}
+
+void StressTest::deleteEverything() {
+    for (const CimPath& job : m_requests.enumerateInstanceNames("Quenx_ConcreteJob")) {
+        EXPECT_TRUE(hasEnded(waitForEnd(job)));
+        m_requests.deleteInstance(job);
+    }
+    // Deleted while they ran: they end all the same.
+    core::drainRetired();
+    // What the rebuilt association classes hold, is what is there without jobs.
+    for (const core::ClassDeclaration& declaration : m_requests.enumerateClasses("", true))
+        m_requests.enumerateInstances(declaration.name);
+}
+
+TEST_F(StressTest, LosesNothing) {
+    m_folder.write("quenx.conf", "ReleaseClaimAfterCheck=1\nFWFilePath=" + m_folder.path() + "\n");
+    const std::int32_t executionsBefore = JobThread::executionCount;
+    run(std::chrono::milliseconds(300), 10);
+    deleteEverything();
+    const std::int64_t before = test::liveBytes();
+
+    run(test::effort().stress, test::effort().jobs);
+    std::vector<std::weak_ptr<core::CimInstance>> jobs;
+    {
+        const core::RequestScope scope;
+        for (core::CimInstance* each :
+             core::InstanceRange(core::GetCimBroker()->getInstances("Quenx_ConcreteJob", "")))
+            jobs.push_back(each->weak_from_this());
+    }
+    deleteEverything();
+    for (const auto& job : jobs)
+        EXPECT_TRUE(job.expired());
+    jobs = {};
+
+    // But for the room that lists keep for more elements: a job takes about 10 KB.
+    EXPECT_LT(test::liveBytes() - before, 1000);
+    EXPECT_EQ(m_watching->mostWriting, 1);
+    EXPECT_EQ(claim(), "");
+    EXPECT_GE(m_started, test::effort().jobs);
+    EXPECT_GT(m_refused, 0U);
+    EXPECT_GT(m_checked, 0U);
+    EXPECT_GT(m_deleted, 0U);
+    // Every job that was started has run, and each flash has ended well.
+    EXPECT_EQ(static_cast<std::uint64_t>(JobThread::executionCount - executionsBefore), m_started);
+    EXPECT_EQ(static_cast<std::uint64_t>(m_watching->writes), m_started);
+    EXPECT_EQ(test::componentsOf("eth4"), "IMG_iSCSI 1, IMG_UEFI 0");
+    test::count("requests made under stress", m_requestCount);
+    test::count("jobs created and deleted under stress", m_started);
+    expectUpdateWorks();
+}
+
+TEST_F(StressTest, WithoutReleaseACheckShutsUpdatesOut) {
+    const std::chrono::milliseconds time = test::effort().stress / 4;
+    const auto deadline = Clock::now() + std::chrono::minutes(1);
+    while (m_checked == 0 && Clock::now() < deadline)
+        run(time, 1);
+    deleteEverything();
+    // Nothing that ran then gave the claim back.
+    const std::string holder = claim();
+    ASSERT_NE(holder, "");
+    const std::uint64_t startedBefore = m_started;
+    run(time, 0);
+    EXPECT_EQ(m_started, startedBefore);
+    EXPECT_EQ(claim(), holder);
+    EXPECT_EQ(install(goodImage(), holder).returnValue, 6U);
+    EXPECT_EQ(install(goodImage(), holder == "eth0" ? "eth1" : "eth0").returnValue, 2U);
+    EXPECT_EQ(m_watching->mostWriting, startedBefore == 0 ? 0 : 1);
+    test::count("requests made under stress", m_requestCount);
+}
+
+}  // namespace

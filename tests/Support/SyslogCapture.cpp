@@ -1,0 +1,137 @@
+#include "Support/SyslogCapture.h"
+
+#include <syslog.h>
+
+#include <cerrno>
+#include <cstdarg>
+#include <cstdio>
+#include <mutex>
+
+#include "Utils/Export.h"
+#include "Utils/Log.h"
+
+namespace test {
+
+namespace {
+
+struct Store {
+    std::mutex mutex;
+    std::vector<SyslogLine> lines;
+    std::string identity;
+    std::function<void(const std::string&)> observer;
+    bool keepsLines = true;
+};
+
+/// Never destroyed: libraries log while they are unloaded.
+Store& store() {
+    static Store* const instance = new Store;
+    return *instance;
+}
+
+void record(int priority, const char* format, va_list arguments) __attribute__((format(printf, 2, 0)));
+void record(int priority, const char* format, va_list arguments) {
+    const int callersErrno = errno;
+    char buffer[8192];
+    vsnprintf(buffer, sizeof buffer, format, arguments);
+    std::function<void(const std::string&)> observer;
+    {
+        std::lock_guard<std::mutex> lock(store().mutex);
+        if (store().keepsLines) store().lines.push_back({priority, buffer});
+        observer = store().observer;
+    }
+    if (observer) observer(buffer);
+    errno = callersErrno;
+}
+
+}  // namespace
+
+void SyslogCapture::clear() {
+    std::lock_guard<std::mutex> lock(store().mutex);
+    store().lines.clear();
+    store().identity.clear();
+}
+
+std::vector<SyslogLine> SyslogCapture::lines() {
+    std::lock_guard<std::mutex> lock(store().mutex);
+    return store().lines;
+}
+
+std::size_t SyslogCapture::count(std::string_view part) {
+    std::lock_guard<std::mutex> lock(store().mutex);
+    std::size_t found = 0;
+    for (const SyslogLine& line : store().lines) {
+        if (line.text.find(part) != std::string::npos) ++found;
+    }
+    return found;
+}
+
+std::vector<std::string> SyslogCapture::messages(std::string_view level) {
+    const std::string begin = "[" + std::string(level) + "] \"";
+    std::vector<std::string> found;
+    for (const SyslogLine& line : lines()) {
+        const std::size_t end = line.text.rfind("\" (");
+        if (line.text.compare(0, begin.size(), begin) != 0 || end == std::string::npos) continue;
+        found.push_back(line.text.substr(begin.size(), end - begin.size()));
+    }
+    return found;
+}
+
+std::string SyslogCapture::identity() {
+    std::lock_guard<std::mutex> lock(store().mutex);
+    return store().identity;
+}
+
+void SyslogCapture::observe(std::function<void(const std::string&)> observer) {
+    std::lock_guard<std::mutex> lock(store().mutex);
+    store().observer = std::move(observer);
+}
+
+void SyslogCapture::keep(bool lines) {
+    std::lock_guard<std::mutex> lock(store().mutex);
+    store().keepsLines = lines;
+}
+
+LogLevelGuard::LogLevelGuard(std::int32_t level) : m_saved(utils::logLevel.exchange(level)) {}
+
+LogLevelGuard::~LogLevelGuard() {
+    utils::logLevel.store(m_saved);
+}
+
+}  // namespace test
+
+// The C library's functions, and the forms that a fortified build calls instead of them.
+extern "C" {
+
+QUENX_EXPORT void openlog(const char* identity, int, int) {
+    std::lock_guard<std::mutex> lock(test::store().mutex);
+    test::store().identity = identity;
+}
+
+QUENX_EXPORT void closelog() {}
+
+QUENX_EXPORT void vsyslog(int priority, const char* format, va_list arguments) {
+    test::record(priority, format, arguments);
+}
+
+QUENX_EXPORT void syslog(int priority, const char* format, ...) {
+    va_list arguments;
+    va_start(arguments, format);
+    test::record(priority, format, arguments);
+    va_end(arguments);
+}
+
+QUENX_EXPORT void __vsyslog_chk(int priority, int, const char* format, va_list arguments)
+    __attribute__((format(printf, 3, 0)));
+QUENX_EXPORT void __vsyslog_chk(int priority, int, const char* format, va_list arguments) {
+    test::record(priority, format, arguments);
+}
+
+QUENX_EXPORT void __syslog_chk(int priority, int, const char* format, ...)
+    __attribute__((format(printf, 3, 4)));
+QUENX_EXPORT void __syslog_chk(int priority, int, const char* format, ...) {
+    va_list arguments;
+    va_start(arguments, format);
+    test::record(priority, format, arguments);
+    va_end(arguments);
+}
+}

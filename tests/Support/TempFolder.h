@@ -1,0 +1,37 @@
+#pragma once
+
+#include <cstdint>
+#include <filesystem>
+#include <span>
+#include <string>
+#include <string_view>
+#include <vector>
+
+namespace test {
+
+/// A new empty folder, removed with everything in it at the end of the scope.
+class TempFolder {
+  public:
+    TempFolder();
+    TempFolder(const TempFolder&) = delete;
+    TempFolder& operator=(const TempFolder&) = delete;
+    ~TempFolder();
+
+    std::string path() const { return m_path.string(); }
+    std::string operator/(std::string_view name) const { return (m_path / name).string(); }
+
+    /// Writes a file in the folder and returns its path.
+    std::string write(std::string_view name, std::string_view content) const;
+    std::string write(std::string_view name, std::span<const uint8_t> content) const;
+
+  private:
+    std::filesystem::path m_path;
+};
+
+/// Makes or replaces a file; a failed expectation when that does not work.
+void writeTestFile(const std::string& path, std::string_view content);
+
+/// All bytes of a file; a failed expectation and nothing when it cannot be read.
+std::vector<uint8_t> readTestFile(const std::string& path);
+
+}  // namespace test

@@ -1,0 +1,18 @@
+#include <gtest/gtest.h>
+
+#include "Support/SyslogCapture.h"
+
+namespace {
+
+/// Every test begins with an empty log.
+class LogCleaner : public ::testing::EmptyTestEventListener {
+    void OnTestStart(const ::testing::TestInfo&) override { test::SyslogCapture::clear(); }
+};
+
+}  // namespace
+
+int main(int argc, char** argv) {
+    ::testing::InitGoogleTest(&argc, argv);
+    ::testing::UnitTest::GetInstance()->listeners().Append(new LogCleaner);
+    return RUN_ALL_TESTS();
+}

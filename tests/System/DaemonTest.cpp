@@ -1,0 +1,263 @@
+// quenx-cimd as a whole, driven by the WBEM client wbemcli.
+#include <gtest/gtest.h>
+#include <sys/socket.h>
+#include <sys/un.h>
+#include <unistd.h>
+
+#include <csignal>
+#include <filesystem>
+#include <thread>
+
+#include "Support/TestRoms.h"
+#include "System/RunningDaemon.h"
+
+namespace {
+
+using test::ProgramResult;
+using test::RunningDaemon;
+
+bool contains(const std::string& text, const std::string& part) {
+    return text.find(part) != std::string::npos;
+}
+
+/// Starts the update of eth0 to a real image and returns the job's path.
+std::string startUpdate(const RunningDaemon& daemon) {
+    const std::string service = daemon.lines("ein", "Quenx_SoftwareInstallationService").at(0);
+    std::string port;
+    for (const std::string& path : daemon.lines("ein", "Quenx_EthernetPort")) {
+        if (contains(path, "eth0")) port = path;
+    }
+    const ProgramResult called =
+        daemon.wbemcli("cm", service,
+                       {"InstallFromURI.URI=\"file://" + test::realRomPath("efi-virtio") +
+                        "\",InstallOptions=5,Target=" + port});
+    EXPECT_TRUE(contains(called.out, "InstallFromURI: 4096")) << called.out << called.error;
+    const std::string front = "root/cimv2:Quenx_ConcreteJob";
+    const std::size_t at = called.out.find(front);
+    return at == std::string::npos ? "" : called.out.substr(at + 11, called.out.find('\n', at) - at - 11);
+}
+
+bool reaches(const RunningDaemon& daemon, const std::string& path, const std::string& state) {
+    for (int round = 0; round < 300; ++round) {
+        if (contains(daemon.lines("gi", path, {"JobState"}).at(0), "JobState=" + state)) return true;
+        std::this_thread::sleep_for(std::chrono::milliseconds(50));
+    }
+    return false;
+}
+
+TEST(DaemonTest, ServesEveryClassToARealClient) {
+    RunningDaemon daemon;
+    std::size_t instances = 0;
+    const std::vector<std::string> classes = daemon.lines("ecn", "");
+    EXPECT_GT(classes.size(), 10U);
+    for (const std::string& name : classes) {
+        const std::size_t names = daemon.lines("ein", name).size();
+        EXPECT_EQ(daemon.lines("ei", name).size(), names) << name;
+        instances += names;
+        EXPECT_FALSE(daemon.lines("-t gc", name).empty()) << name;
+    }
+    EXPECT_GT(instances, 10U);
+    for (const char* operation : {"ei", "gc", "ec"}) {
+        EXPECT_EQ(daemon.wbemcli(operation, "CIM_ManagedElement", {}, true).status, 0) << operation;
+    }
+    // What is printed can be asked for, key by key, references included.
+    for (const char* name : {"Quenx_ElementCapabilities", "Quenx_EthernetPort", "Quenx_RegisteredProfile"}) {
+        for (const std::string& path : daemon.lines("ein", name))
+            daemon.lines("gi", path);
+    }
+}
+
+TEST(DaemonTest, CarriesAnUpdateFromItsStartToItsDeletion) {
+    RunningDaemon daemon;
+    const std::string job = startUpdate(daemon);
+    ASSERT_FALSE(job.empty());
+    const std::vector<std::string> neighbours = daemon.lines("ain", job);
+    EXPECT_EQ(neighbours.size(), 3U);  // the service, the port and its card
+    EXPECT_EQ(daemon.lines("ai", job).size(), neighbours.size());
+    EXPECT_EQ(daemon.lines("rin", job).size(), 3U);
+    EXPECT_EQ(daemon.lines("ri", job).size(), 3U);
+    EXPECT_EQ(daemon.lines("-ac CIM_OwningJobElement -ar OwnedElement ain", job).size(), 1U);
+    EXPECT_TRUE(reaches(daemon, job, "7"));
+    bool isNew = false;
+    for (const std::string& identity : daemon.lines("ei", "Quenx_SoftwareIdentity")) {
+        isNew |= contains(identity, "eth0:IMG_PXE") && contains(identity, "VersionString=\"IMG_PXE 1\"");
+    }
+    EXPECT_TRUE(isNew);
+    EXPECT_EQ(daemon.wbemcli("di", job).status, 0);
+    EXPECT_TRUE(contains(daemon.wbemcli("gi", job).error, "(6) CIM_ERR_NOT_FOUND"));
+    EXPECT_TRUE(contains(daemon.wbemcli("di", job).error, "(6) CIM_ERR_NOT_FOUND"));
+}
+
+TEST(DaemonTest, AnswersMistakesByTheirStatus) {
+    RunningDaemon daemon;
+    const std::string service = daemon.lines("ein", "Quenx_SoftwareInstallationService").at(0);
+    const struct {
+        const char* operation;
+        std::string path;
+        std::vector<std::string> arguments;
+        const char* expected;
+    } table[] = {
+        {"ei", "Unknown", {}, "(5) CIM_ERR_INVALID_CLASS"},
+        {"gc", "Unknown", {}, "(6) CIM_ERR_NOT_FOUND"},
+        {"gi", "Quenx_ConcreteJob.InstanceID=\"none\"", {}, "(6) CIM_ERR_NOT_FOUND"},
+        {"gi", "Quenx_ConcreteJob.Other=\"none\"", {}, "(4) CIM_ERR_INVALID_PARAMETER"},
+        {"ain", "Quenx_ConcreteJob", {}, "(4) CIM_ERR_INVALID_PARAMETER"},
+        {"di", service, {}, "(7) CIM_ERR_NOT_SUPPORTED"},
+        {"mi", service, {"Caption=\"x\""}, "(7) CIM_ERR_NOT_SUPPORTED"},
+        {"ci", "Quenx_ConcreteJob.InstanceID=\"x\"", {"InstanceID=\"x\""}, "(7) CIM_ERR_NOT_SUPPORTED"},
+        {"cm", service, {"InstallFromURI.InstallOptions=5"}, "(1) CIM_ERR_FAILED: "},
+        {"cm", service, {"Nothing"}, "(17) CIM_ERR_METHOD_NOT_FOUND"},
+    };
+    for (const auto& row : table) {
+        const ProgramResult result = daemon.wbemcli(row.operation, row.path, row.arguments);
+        EXPECT_EQ(result.status, 16) << row.operation << row.path << result.out;
+        EXPECT_TRUE(contains(result.error, row.expected)) << row.operation << row.path << result.error;
+    }
+    daemon.user = daemon.password = "guest";
+    EXPECT_EQ(daemon.lines("ein", "Quenx_SoftwareInstallationService").size(), 1U);
+    EXPECT_TRUE(contains(daemon.wbemcli("cm", service, {"InstallFromURI.InstallOptions=5"}).error,
+                         "(2) CIM_ERR_ACCESS_DENIED"));
+    daemon.password = "wrong";
+    EXPECT_TRUE(contains(daemon.wbemcli("ei", "CIM_Service").error, "Invalid username/password"));
+    daemon.namespaceName = "root/unknown";
+    daemon.password = "guest";
+    EXPECT_TRUE(contains(daemon.wbemcli("ei", "CIM_Service").error, "(3) CIM_ERR_INVALID_NAMESPACE"));
+}
+
+TEST(DaemonTest, IsDiscoveredFromTheInteropNamespace) {
+    RunningDaemon daemon;
+    for (const char* name : {"interop", "root/interop"}) {
+        daemon.namespaceName = name;
+        EXPECT_EQ(daemon.lines("ein", "CIM_ObjectManager").size(), 1U);
+        EXPECT_EQ(daemon.lines("ein", "CIM_Namespace").size(), 3U);
+        std::string profile;
+        for (const std::string& path : daemon.lines("ein", "CIM_RegisteredProfile")) {
+            if (contains(path, "SoftwareUpdate")) profile = path;
+        }
+        const auto service = daemon.lines("-ac CIM_ElementConformsToProfile ain", profile);
+        ASSERT_EQ(service.size(), 1U);
+        EXPECT_TRUE(contains(service[0], "/root/cimv2:Quenx_SoftwareInstallationService.")) << service[0];
+        const auto referenced = daemon.lines("-ac CIM_ReferencedProfile ain", profile);
+        ASSERT_EQ(referenced.size(), 1U);
+        EXPECT_TRUE(contains(referenced[0], "Quenx:EthernetPort"));
+    }
+}
+
+/// Stands in for the service manager.
+class NotifySocket {
+  public:
+    explicit NotifySocket(const std::string& path) {
+        sockaddr_un address{};
+        address.sun_family = AF_UNIX;
+        path.copy(address.sun_path, sizeof address.sun_path - 1);
+        EXPECT_EQ(::bind(m_socket, reinterpret_cast<const sockaddr*>(&address), sizeof address), 0);
+    }
+    ~NotifySocket() { ::close(m_socket); }
+    NotifySocket(const NotifySocket&) = delete;
+    NotifySocket& operator=(const NotifySocket&) = delete;
+
+    std::string all() const {
+        std::string text;
+        char bytes[512];
+        ssize_t length = 0;
+        while ((length = ::recv(m_socket, bytes, sizeof bytes, MSG_DONTWAIT)) > 0) {
+            text.append(bytes, static_cast<std::size_t>(length)).append("\n");
+        }
+        return text;
+    }
+
+  private:
+    int m_socket = ::socket(AF_UNIX, SOCK_DGRAM | SOCK_CLOEXEC, 0);
+};
+
+TEST(DaemonTest, LetsAFlashEndBeforeItStops) {
+    const test::TempFolder folder;
+    const NotifySocket manager(folder / "notify");
+    RunningDaemon daemon({}, {"NOTIFY_SOCKET=" + (folder / "notify")});
+    const std::string job = startUpdate(daemon);
+    ASSERT_TRUE(reaches(daemon, job, "4"));
+    daemon.program().send(SIGTERM);
+    ASSERT_TRUE(daemon.program().waitFor("waiting for the flash of Quenx:FirmwareUpdate@Job#1 at "));
+    daemon.program().send(SIGTERM);
+    const ProgramResult result = daemon.program().finish();
+    EXPECT_EQ(result.status, 0) << result.out;
+    EXPECT_TRUE(contains(result.out, "asked again to stop")) << result.out;
+    EXPECT_TRUE(contains(result.out, "stopped")) << result.out;
+    const std::string told = manager.all();
+    for (const char* part : {"READY=1", "STOPPING=1", "EXTEND_TIMEOUT_USEC=30000000", "STATUS=waiting for"}) {
+        EXPECT_TRUE(contains(told, part)) << told;
+    }
+}
+
+TEST(DaemonTest, ReadsUsersAndCertificateAgain) {
+    RunningDaemon daemon;
+    daemon.setPassword("later");
+    const auto certificate = test::readTestFile(daemon.folder() / "cert.pem");
+    for (const char* file : {"cert.pem", "key.pem"})
+        std::filesystem::remove(daemon.folder() / file);
+    EXPECT_EQ(test::run({QUENX_CIMD, "--check-config", "--config", daemon.folder().write("empty", ""),
+                         "--tls-certificate", daemon.folder() / "cert.pem", "--tls-key",
+                         daemon.folder() / "key.pem"})
+                  .status,
+              0);
+    const auto isShown = [&](const std::string& user) {
+        daemon.user = daemon.password = user;
+        return daemon.wbemcli("ein", "CIM_Service").status == 0;
+    };
+    EXPECT_FALSE(isShown("later"));
+    // What cannot be read stays as it was.
+    daemon.program().send(SIGHUP);
+    ASSERT_TRUE(daemon.program().waitFor("the certificate stays as it was"));
+    ASSERT_TRUE(daemon.program().waitFor("read certificate and users again"));
+    EXPECT_TRUE(isShown("later"));
+    EXPECT_TRUE(isShown("admin"));
+    daemon.folder().write("cert.pem", certificate);
+    EXPECT_EQ(daemon.wbemcli("ein", "CIM_Service", {}, true).status, 0);
+
+    const RunningDaemon other;
+    for (const char* file : {"cert.pem", "key.pem"}) {
+        std::filesystem::copy_file(other.folder() / file, daemon.folder() / file,
+                                   std::filesystem::copy_options::overwrite_existing);
+    }
+    EXPECT_NE(daemon.wbemcli("ein", "CIM_Service", {}, true).status, 0);  // still shows the old one
+    daemon.program().send(SIGHUP);
+    bool isNew = false;
+    for (int round = 0; round < 100 && !isNew; ++round) {
+        isNew = daemon.wbemcli("ein", "CIM_Service", {}, true).status == 0;
+    }
+    EXPECT_TRUE(isNew);
+    EXPECT_EQ(daemon.stop().status, 0);
+}
+
+TEST(DaemonTest, NamesWhatKeepsItFromServing) {
+    const test::TempFolder folder;
+    folder.write("libQuenx_Broken.so", "no library");
+    for (const char* name : {"libQuenx_SoftwareUpdate.so", "libQuenx_SoftwareInventory.so"}) {
+        std::filesystem::create_symlink(std::filesystem::path(QUENX_LIBRARIES) / name, folder / name);
+    }
+    RunningDaemon daemon({"--providers-directory", folder.path()});
+    EXPECT_EQ(daemon.lines("ein", "Quenx_EthernetPort").size(), 2U);
+    EXPECT_TRUE(contains(daemon.program().seen(), "libQuenx_Broken.so is not loaded: "))
+        << daemon.program().seen();
+
+    const auto started = [&](std::vector<std::string> options) {
+        options.insert(options.begin(), {QUENX_CIMD, "--config", folder.write("empty", ""),
+                                         "--listen-https=false", "--listen-http"});
+        return test::run(options);
+    };
+    const ProgramResult second = started({"--daemon-lock-file", daemon.folder() / "lock"});
+    EXPECT_EQ(second.status, 1);
+    EXPECT_TRUE(contains(second.error, "is held by process " + std::to_string(daemon.program().id())))
+        << second.error;
+    const std::string lock = folder / "lock";
+    const ProgramResult taken =
+        started({"--daemon-lock-file", lock, "--listen-http-port", std::to_string(daemon.httpPort())});
+    EXPECT_EQ(taken.status, 1);
+    EXPECT_TRUE(contains(taken.error, "cannot listen on 127.0.0.1 port ")) << taken.error;
+    EXPECT_EQ(started({"--daemon-lock-file", lock, "--listen-http-port", "0", "--providers-directory",
+                       "/nonexistent"})
+                  .status,
+              1);
+}
+
+}  // namespace

@@ -1,0 +1,115 @@
+#include "System/RawConnection.h"
+
+#include <arpa/inet.h>
+#include <netinet/in.h>
+#include <poll.h>
+#include <sys/socket.h>
+#include <unistd.h>
+
+#include <array>
+#include <cstdlib>
+#include <utility>
+
+namespace test {
+
+namespace {
+
+sockaddr_in addressOf(const std::string& text, int port) {
+    sockaddr_in address{};
+    address.sin_family = AF_INET;
+    address.sin_port = htons(static_cast<std::uint16_t>(port));
+    ::inet_pton(AF_INET, text.c_str(), &address.sin_addr);
+    return address;
+}
+
+/// Whether the text holds a head and as much body as it announces.
+bool isWhole(const std::string& answer) {
+    const std::size_t end = answer.find("\r\n\r\n");
+    const std::size_t length = answer.find("Content-Length: ");
+    if (end == std::string::npos || length > end) return false;
+    return answer.size() - end - 4 >= std::strtoul(answer.c_str() + length + 16, nullptr, 10);
+}
+
+}  // namespace
+
+RawConnection::RawConnection(int port, const std::string& from)
+    : m_socket(::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0)) {
+    const sockaddr_in here = addressOf(from, 0);
+    const sockaddr_in there = addressOf("127.0.0.1", port);
+    if (::bind(m_socket, reinterpret_cast<const sockaddr*>(&here), sizeof here) != 0 ||
+        ::connect(m_socket, reinterpret_cast<const sockaddr*>(&there), sizeof there) != 0) {
+        ::close(std::exchange(m_socket, -1));
+    }
+}
+
+RawConnection::~RawConnection() {
+    if (m_socket >= 0) ::close(m_socket);
+}
+
+RawConnection::RawConnection(RawConnection&& other) noexcept : m_socket(std::exchange(other.m_socket, -1)) {}
+
+bool RawConnection::send(std::string_view bytes) const {
+    while (!bytes.empty()) {
+        const ssize_t sent = ::send(m_socket, bytes.data(), bytes.size(), MSG_NOSIGNAL);
+        if (sent <= 0) return false;
+        bytes.remove_prefix(static_cast<std::size_t>(sent));
+    }
+    return true;
+}
+
+void RawConnection::endSending() const {
+    ::shutdown(m_socket, SHUT_WR);
+}
+
+std::string RawConnection::receive(std::chrono::milliseconds patience) const {
+    std::string answer;
+    std::array<char, 4096> bytes{};
+    while (!isWhole(answer)) {
+        pollfd waiting{m_socket, POLLIN, 0};
+        if (::poll(&waiting, 1, static_cast<int>(patience.count())) <= 0) break;
+        const ssize_t length = ::recv(m_socket, bytes.data(), bytes.size(), 0);
+        if (length <= 0) break;
+        answer.append(bytes.data(), static_cast<std::size_t>(length));
+    }
+    return answer;
+}
+
+bool RawConnection::isClosedWithin(std::chrono::milliseconds time) const {
+    const auto end = std::chrono::steady_clock::now() + time;
+    std::array<char, 4096> bytes{};
+    for (;;) {
+        const auto left = end - std::chrono::steady_clock::now();
+        const auto patience = std::chrono::duration_cast<std::chrono::milliseconds>(left).count();
+        pollfd waiting{m_socket, POLLIN, 0};
+        if (patience <= 0 || ::poll(&waiting, 1, static_cast<int>(patience)) <= 0) return false;
+        if (::recv(m_socket, bytes.data(), bytes.size(), 0) <= 0) return true;
+    }
+}
+
+std::string base64(const std::string& bytes) {
+    constexpr char kLetters[] = "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+/";
+    std::string text;
+    for (std::size_t i = 0; i < bytes.size(); i += 3) {
+        unsigned int bits = 0;
+        for (std::size_t k = 0; k < 3; ++k) {
+            bits = (bits << 8) | (i + k < bytes.size() ? static_cast<unsigned char>(bytes[i + k]) : 0U);
+        }
+        for (std::size_t k = 0; k < 4; ++k) {
+            text += i + k <= bytes.size() ? kLetters[(bits >> (18 - 6 * k)) & 63U] : '=';
+        }
+    }
+    return text;
+}
+
+std::string httpRequest(const std::string& body, const std::string& user) {
+    std::string text = "POST /cimom HTTP/1.1\r\nHost: 127.0.0.1\r\nContent-Type: application/xml\r\n";
+    text += "CIMOperation: MethodCall\r\n";
+    if (!user.empty()) text += "Authorization: Basic " + base64(user + ":" + user) + "\r\n";
+    return text + "Content-Length: " + std::to_string(body.size()) + "\r\n\r\n" + body;
+}
+
+int statusOf(const std::string& answer) {
+    return answer.starts_with("HTTP/1.1 ") ? std::atoi(answer.c_str() + 9) : 0;
+}
+
+}  // namespace test

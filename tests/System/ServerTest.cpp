@@ -1,0 +1,96 @@
+// quenxctl on a server: the same verbs over CIM-XML, against a real quenx-cimd.
+#include <gtest/gtest.h>
+
+#include <nlohmann/json.hpp>
+
+#include "Support/TestRoms.h"
+#include "System/RunningDaemon.h"
+
+namespace {
+
+using test::Program;
+using test::ProgramResult;
+
+bool contains(const std::string& text, const std::string& part) {
+    return text.find(part) != std::string::npos;
+}
+
+class Server : public ::testing::Test {
+  protected:
+    std::vector<std::string> command(std::vector<std::string> arguments) const {
+        const std::string url = "https://127.0.0.1:" + std::to_string(daemon_.httpsPort());
+        std::vector<std::string> front = {QUENXCTL, "--server", url, "--user", "admin"};
+        front.insert(front.end(), arguments.begin(), arguments.end());
+        return front;
+    }
+    /// With the daemon's own certificate as the one to trust.
+    ProgramResult quenxctl(std::vector<std::string> arguments, const std::string& password = "admin") const {
+        arguments.insert(arguments.end(), {"--cacert", daemon_.folder() / "cert.pem"});
+        return test::run(command(std::move(arguments)), {"QUENXCTL_PASSWORD=" + password});
+    }
+
+    test::RunningDaemon daemon_;
+    std::string image_ = test::realRomPath("efi-virtio");
+};
+
+TEST_F(Server, UpdatesAndKeepsTheJob) {
+    const ProgramResult result = quenxctl({"install", "--target", "eth0", image_});
+    EXPECT_EQ(result.status, 0) << result.error;
+    EXPECT_TRUE(contains(result.out, "eth0 is updated.\n  IMG_PXE   0 -> 1\n")) << result.out;
+    EXPECT_EQ(quenxctl({"install", "--target", "eth0", image_}).status, 3);
+    const ProgramResult refused = quenxctl({"install", "--target", "eth3", image_});
+    EXPECT_EQ(refused.status, 1);
+    EXPECT_TRUE(contains(refused.error, "The firmware of eth3 cannot be updated.")) << refused.error;
+
+    const auto jobs = nlohmann::json::parse(quenxctl({"jobs", "--json"}).out)["jobs"];
+    ASSERT_EQ(jobs.size(), 1U);
+    EXPECT_EQ(jobs[0]["state"], 7);
+    EXPECT_EQ(quenxctl({"delete", jobs[0]["id"]}).status, 0);
+    EXPECT_EQ(quenxctl({"delete", jobs[0]["id"]}).status, 1);
+    EXPECT_TRUE(nlohmann::json::parse(quenxctl({"jobs", "--json"}).out)["jobs"].empty());
+}
+
+TEST_F(Server, ShowsTheSameModelAsInProcess) {
+    EXPECT_TRUE(contains(quenxctl({"adapters"}).out, "IMG_PXE 0, IMG_UEFI 0"));
+    EXPECT_TRUE(contains(quenxctl({"identities"}).out, "Firmware of adapter eth0"));
+    const ProgramResult names = quenxctl({"instances", "Quenx_EthernetPort", "--names"});
+    const std::string port = names.out.substr(0, names.out.find('\n'));
+    EXPECT_TRUE(contains(quenxctl({"associators", port, "--result-class", "Quenx_SoftwareIdentity"}).out,
+                         "InstanceID = \"Quenx:eth0:IMG_PXE\""));
+    const std::string mof = quenxctl({"mof"}).out;
+    EXPECT_TRUE(contains(mof, "class Quenx_ConcreteJob : CIM_ConcreteJob {")) << mof;
+    EXPECT_TRUE(contains(mof, "CIM_ConcreteJob REF Job")) << mof;
+    const ProgramResult unknown = quenxctl({"instances", "No_Such"});
+    EXPECT_EQ(unknown.status, 1);
+    EXPECT_TRUE(contains(unknown.error, "No_Such")) << unknown.error;
+}
+
+TEST_F(Server, RefusesWhomItCannotTrust) {
+    const ProgramResult unknown = test::run(command({"adapters"}), {"QUENXCTL_PASSWORD=admin"});
+    EXPECT_EQ(unknown.status, 1);
+    EXPECT_TRUE(contains(unknown.error, "with --cacert.")) << unknown.error;
+    const ProgramResult loud = test::run(command({"adapters", "--insecure"}), {"QUENXCTL_PASSWORD=admin"});
+    EXPECT_EQ(loud.status, 0);
+    EXPECT_TRUE(contains(loud.error, "WARNING: --insecure")) << loud.error;
+    const ProgramResult wrong = quenxctl({"adapters"}, "guess");
+    EXPECT_EQ(wrong.status, 1);
+    EXPECT_TRUE(contains(wrong.error, "does not accept the user name and password.")) << wrong.error;
+}
+
+TEST_F(Server, AsksForThePasswordWithoutShowingIt) {
+    Program program(command({"adapters", "--cacert", daemon_.folder() / "cert.pem"}),
+                    Program::Output::Terminal, {"QUENXCTL_PASSWORD"});
+    ASSERT_TRUE(program.waitFor("Password for admin: "));
+    program.type("admin\n");
+    const ProgramResult result = program.finish();
+    EXPECT_EQ(result.status, 0) << result.out;
+    EXPECT_FALSE(contains(result.out, "Password for admin: admin")) << result.out;
+
+    const ProgramResult silent = test::run({"/bin/sh", "-c", "\"$@\" </dev/null", "sh", QUENXCTL, "--server",
+                                            "https://127.0.0.1:1", "--user", "admin", "adapters"},
+                                           {"QUENXCTL_PASSWORD"});
+    EXPECT_EQ(silent.status, 2);
+    EXPECT_TRUE(contains(silent.error, "no terminal to ask on.")) << silent.error;
+}
+
+}  // namespace

@@ -1,0 +1,165 @@
+#include "Utils/Log.h"
+
+#include <dlfcn.h>
+#include <gtest/gtest.h>
+#include <syslog.h>
+
+#include <cerrno>
+#include <cstdlib>
+#include <cstring>
+#include <stdexcept>
+#include <thread>
+#include <vector>
+
+#include "Support/SyslogCapture.h"
+
+using test::LogLevelGuard;
+using test::SyslogCapture;
+
+namespace {
+
+constexpr const char* levelVariable = "TARVEL_SMASHv2_LOG_LEVEL";
+
+std::string firstLine() {
+    const auto lines = SyslogCapture::lines();
+    return lines.empty() ? std::string() : lines.front().text;
+}
+
+void logOneError() {
+    utils::writeErrorLog("dir/file.cpp", "function", 7, "text");
+}
+
+}  // namespace
+
+TEST(Log, LevelComesFromTheFirstCharacterOfTheVariable) {
+    const LogLevelGuard guard(-1);
+    const struct {
+        const char* value;
+        int level;
+    } rows[] = {{nullptr, 1}, {"", 1}, {"1", 1}, {"3", 1}, {"debug", 1}, {"0", 0}, {"00", 0}, {"2x", 2}};
+    for (const auto& row : rows) {
+        SyslogCapture::clear();
+        utils::logLevel = -1;
+        row.value == nullptr ? unsetenv(levelVariable) : setenv(levelVariable, row.value, 1);
+        utils::writeDebugLog("f", "g", 1, "debug text");
+        utils::writeErrorLog("f", "g", 1, "error text");
+
+        SCOPED_TRACE(row.value == nullptr ? "(unset)" : row.value);
+        EXPECT_EQ(utils::logLevel, row.level);
+        EXPECT_EQ(SyslogCapture::identity(), "quenx");
+        const auto lines = SyslogCapture::lines();
+        ASSERT_GE(lines.size(), 2U);
+        EXPECT_EQ(lines[0].text, "Opening log, level=" + std::to_string(row.level));
+        EXPECT_EQ(lines[0].priority, LOG_NOTICE);
+        EXPECT_EQ(lines[1].priority, LOG_NOTICE);
+        EXPECT_EQ(SyslogCapture::count("[debug] \"debug text\" (g@f:1)"), row.level == 2 ? 1U : 0U);
+        EXPECT_EQ(SyslogCapture::count("[error] \"error text\" (g@f:1)"), row.level >= 1 ? 1U : 0U);
+        EXPECT_EQ(SyslogCapture::count("Opening log"), 1U);
+    }
+    unsetenv(levelVariable);
+}
+
+TEST(Log, FirstLinesOfManyThreadsOpenItOnce) {
+    const LogLevelGuard guard(-1);
+    std::vector<std::thread> threads;
+    for (int i = 0; i < 8; ++i)
+        threads.emplace_back(&logOneError);
+    for (std::thread& thread : threads)
+        thread.join();
+    EXPECT_EQ(SyslogCapture::count("Opening log"), 1U);
+    EXPECT_EQ(SyslogCapture::count("[error]"), 8U);
+}
+
+TEST(Log, LineShowsBaseNameAndIsCutAt511) {
+    EXPECT_EQ(utils::formatLogMessage("src/a/B.cpp", "run", 12, "debug", "x"),
+              "[debug] \"x\" (run@B.cpp:12)");
+    EXPECT_EQ(utils::formatLogMessage("B.cpp", "run", 12, "error", "100%d"),
+              "[error] \"100%d\" (run@B.cpp:12)");
+    EXPECT_EQ(utils::formatLogMessage("f", "g", 1, "error", std::string(600, 'x')).size(), 511U);
+}
+
+TEST(Log, NothingInAMessageIsInterpretedThatNeedsAnArgument) {
+    const LogLevelGuard guard(2);
+    const std::string frame = "[debug] \"\" (g@f:1)";
+    // A line whose cut at 511 characters falls behind the first of two percent signs.
+    const std::string cut(511 - std::strlen("[debug] \"") - 1, 'x');
+    const struct {
+        std::string message;
+        std::string expected;
+    } rows[] = {
+        {"%n%s%1$s%*d %", "[debug] \"%n%s%1$s%*d %\" (g@f:1)"},
+        {"50%% of %m", std::string("[debug] \"50% of ") + std::strerror(ENOENT) + "\" (g@f:1)"},
+        {"%%m %%%m", std::string("[debug] \"%m %") + std::strerror(ENOENT) + "\" (g@f:1)"},
+        {"a\n[error] \"forged\"\t\x7F", "[debug] \"a#012[error] \"forged\"#011#177\" (g@f:1)"},
+        {cut + "%%", "[debug] \"" + cut + "%"},
+        {"\xC3\xA4", "[debug] \"\xC3\xA4\" (g@f:1)"},
+    };
+    for (const auto& row : rows) {
+        SyslogCapture::clear();
+        errno = ENOENT;
+        utils::writeDebugLog("f", "g", 1, row.message);
+        EXPECT_EQ(errno, ENOENT);
+        EXPECT_EQ(firstLine(), row.expected);
+        EXPECT_EQ(SyslogCapture::lines().size(), 1U);
+        EXPECT_EQ(SyslogCapture::lines().front().priority, LOG_ERR);
+    }
+}
+
+TEST(Log, ErrorsCarryABacktraceWithSymbolsFromLevelTwo) {
+    for (const int level : {1, 2}) {
+        const LogLevelGuard guard(level);
+        SyslogCapture::clear();
+        logOneError();
+        const auto lines = SyslogCapture::lines();
+        ASSERT_GE(lines.size(), 2U);
+        EXPECT_EQ(lines[0].text, "[error] \"text\" (function@file.cpp:7)");
+        const std::string& addresses = lines[1].text;
+        ASSERT_EQ(addresses.rfind("  Backtrace: ", 0), 0U) << addresses;
+        const std::size_t frames =
+            static_cast<std::size_t>(std::count(addresses.begin(), addresses.end(), ' ')) - 4 + 1;
+        EXPECT_GT(frames, 1U);
+        EXPECT_EQ(addresses.back(), ' ');
+        for (std::size_t at = 13; at < addresses.size(); at = addresses.find(' ', at) + 1) {
+            EXPECT_GE(addresses.find(' ', at) - at, 8U) << addresses;
+        }
+        EXPECT_EQ(lines.size(), level == 2 ? 2 + frames : 2);
+    }
+    SyslogCapture::clear();
+    utils::logBacktrace(LOG_ERR, 0, true);
+    utils::logBacktrace(LOG_ERR, -1, true);
+    EXPECT_TRUE(SyslogCapture::lines().empty());
+    utils::logBacktrace(LOG_NOTICE, 3, false);
+    EXPECT_EQ(firstLine(), "  Backtrace: ");
+}
+
+TEST(Log, MacrosEvaluateOnlyWhatIsWrittenAndLetNothingOut) {
+    int evaluated = 0;
+    const auto count = [&] { return ++evaluated; };
+    const auto fail = []() -> int { throw std::runtime_error("argument"); };
+    {
+        const LogLevelGuard guard(1);
+        QUENX_DEBUG("%d", count());
+        QUENX_DEBUG_TEXT(std::to_string(count()));
+        EXPECT_EQ(evaluated, 0);
+        QUENX_ERROR("%d", count());
+        EXPECT_EQ(evaluated, 1);
+    }
+    SyslogCapture::clear();
+    const LogLevelGuard guard(2);
+    EXPECT_NO_THROW(QUENX_DEBUG("%d", fail()));
+    EXPECT_NO_THROW(QUENX_ERROR_TEXT(std::to_string(fail())));
+    EXPECT_TRUE(SyslogCapture::lines().empty());
+    QUENX_DEBUG("%d%%", 50);
+    QUENX_DEBUG_TEXT("%d");
+    EXPECT_EQ(SyslogCapture::messages(), (std::vector<std::string>{"50%", "%d"}));
+    EXPECT_TRUE(SyslogCapture::contains("(TestBody@LogTest.cpp:"));
+}
+
+TEST(Log, VpddbgIsFoundByItsPlainNameAndDropsNewlines) {
+    const LogLevelGuard guard(2);
+    const auto entry = reinterpret_cast<void (*)(const char*, ...)>(dlsym(RTLD_DEFAULT, "vpddbg"));
+    ASSERT_NE(entry, nullptr);
+    entry("a\n%s\n", "b\nc");
+    EXPECT_EQ(SyslogCapture::messages(), std::vector<std::string>{"abc"});
+    EXPECT_TRUE(SyslogCapture::contains("(vpddbg@Utils.cpp:"));
+}

@@ -1,0 +1,124 @@
+#include "Utils/Os/Linux/SMASHv2Config.h"
+
+#include <gtest/gtest.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <thread>
+
+#include "Support/SyslogCapture.h"
+#include "Support/TempFolder.h"
+
+using test::SyslogCapture;
+using utils::SMASHv2Config;
+
+namespace {
+
+struct ConfigTest : ::testing::Test {
+    ConfigTest() { SyslogCapture::clear(); }  // the lines of opening the log and of construction
+    void write(const std::string& content) { folder.write("conf", content); }
+    test::TempFolder folder;
+    SMASHv2Config config{folder / "conf"};
+    test::LogLevelGuard guard{2};
+};
+
+}  // namespace
+
+TEST_F(ConfigTest, DefaultsStandWithoutAFile) {
+    EXPECT_EQ(config.getNamespace(), "root/cimv2");
+    EXPECT_EQ(config.getLockerTimeout(), 300000U);
+    EXPECT_TRUE(config.isDowngradeEnabled());
+    EXPECT_TRUE(config.getFirmwareFilesPaths().empty());
+    EXPECT_FALSE(config.getReleaseClaimAfterCheck());
+    EXPECT_TRUE(SyslogCapture::lines().empty());
+    EXPECT_EQ(utils::AutoSingleton<SMASHv2Config>::getInstance(), &config);
+}
+
+TEST_F(ConfigTest, LinesAreReadAsTheySayAndLogged) {
+    const struct {
+        const char* line;
+        const char* cimNamespace;
+        std::uint32_t timeout;
+        const char* message;  // null for none
+    } rows[] = {
+        {"Namespace = interop", "root/cimv2", 300000, nullptr},
+        {"Namespace", "root/cimv2", 300000, nullptr},
+        {"namespace=root/x", "root/cimv2", 300000, nullptr},
+        {"  # Namespace=root/x", "root/cimv2", 300000, nullptr},
+        {"Namespace2=root/x", "root/cimv2", 300000, nullptr},
+        {"\tNamespace==root/x=y z", "root/x", 300000, "Read NameSpace : root/x"},
+        {"Namespace=rootless", "rootless", 300000, "Read NameSpace : rootless"},
+        {"Namespace=%n%s", "root/cimv2", 300000, nullptr},
+        {"Timeout=0x1F4", "root/cimv2", 500, "Read LockerTimeout : 500"},
+        {"Timeout 42 43", "root/cimv2", 42, "Read LockerTimeout : 42"},
+        {"Timeout=0xFFFFFFFF", "root/cimv2", 4294967295U, "Read LockerTimeout : -1"},
+        {"Timeout=0500", "root/cimv2", 300000, "Read LockerTimeout : 300000"},
+        {"Timeout=-1", "root/cimv2", 300000, "Read LockerTimeout : 300000"},
+        {"Timeout=", "root/cimv2", 300000, "Read LockerTimeout : 300000"},
+        {"OEMCustomizeable=4x", "root/cimv2", 300000, "Read OEMCustomizeable : 4"},
+        {"OEMCustomizeable=65536", "root/cimv2", 300000, nullptr},
+        {"OEMCustomizeable=x", "root/cimv2", 300000, nullptr},
+        {"ReleaseClaimAfterCheck=1", "root/cimv2", 300000, "Read ReleaseClaimAfterCheck : 1"},
+        {"ReleaseClaimAfterCheck=2", "root/cimv2", 300000, nullptr},
+    };
+    for (const auto& row : rows) {
+        write(std::string("\n \t\n") + row.line + "\nUnknown=1\n");
+        SMASHv2Config fresh(folder / "conf");
+        SyslogCapture::clear();
+        fresh.initialize();
+        SCOPED_TRACE(row.line);
+        std::vector<std::string> expected;
+        if (row.message != nullptr) expected.emplace_back(row.message);
+        EXPECT_EQ(SyslogCapture::messages(), expected);
+        EXPECT_EQ(SyslogCapture::count("(initialize@SMASHv2Config.cpp:"), expected.size());
+        EXPECT_EQ(fresh.getNamespace(), row.cimNamespace);
+        EXPECT_EQ(fresh.getLockerTimeout(), row.timeout);
+    }
+}
+
+TEST_F(ConfigTest, ARemovedKeyKeepsItsValueAndADowngradeStaysForbidden) {
+    write("Namespace=root/a\nTimeout=7\nOEMCustomizeable=5\nReleaseClaimAfterCheck=1\n");
+    EXPECT_TRUE(config.getReleaseClaimAfterCheck());
+    write("");
+    EXPECT_EQ(config.getNamespace(), "root/a");
+    EXPECT_EQ(config.getLockerTimeout(), 7U);
+    EXPECT_TRUE(config.getReleaseClaimAfterCheck());
+    EXPECT_FALSE(config.isDowngradeEnabled());
+    write("OEMCustomizeable=4\nReleaseClaimAfterCheck=0\n");
+    EXPECT_FALSE(config.isDowngradeEnabled());
+    EXPECT_FALSE(config.getReleaseClaimAfterCheck());
+    SMASHv2Config fresh(folder / "conf");
+    EXPECT_TRUE(fresh.isDowngradeEnabled());
+}
+
+TEST_F(ConfigTest, DirectoriesAreBuiltAnewFromEveryLine) {
+    const std::string one = folder / "one", two = folder / "two", three = folder / "three";
+    for (const std::string& path : {one, two, three})
+        ASSERT_EQ(mkdir(path.c_str(), 0700), 0);
+    write("FWFilePath= " + one + "/ ; /missing;;  ;" + two + "\n" +  // a blank item and the root are none
+          "FWFilePath=/;\t" + three + ";" + one + "/x;" + three + "\n");
+    EXPECT_EQ(config.getFirmwareFilesPaths(), (utils::StringArray{one, two, three}));
+    EXPECT_EQ(
+        SyslogCapture::messages(),
+        (std::vector<std::string>{"Adding path-> " + one, "Adding path-> " + two, "Adding path-> " + three}));
+    ASSERT_EQ(unlink((folder / "conf").c_str()), 0);
+    EXPECT_TRUE(config.getFirmwareFilesPaths().empty());
+}
+
+TEST_F(ConfigTest, ManyThreadsQueryWhileTheFileChanges) {
+    test::LogLevelGuard quiet(0);
+    std::vector<std::thread> threads;
+    for (int i = 0; i < 4; ++i) {
+        threads.emplace_back([&] {
+            for (int round = 0; round < 100; ++round) {
+                EXPECT_EQ(config.getNamespace().substr(0, 4), "root");
+                config.isDowngradeEnabled();
+                config.getFirmwareFilesPaths();
+            }
+        });
+    }
+    for (int round = 0; round < 50; ++round)
+        write("Namespace=root/" + std::string(1000, 'x') + "\nFWFilePath=/tmp\n");
+    for (std::thread& thread : threads)
+        thread.join();
+}

@@ -1,0 +1,78 @@
+#include "Utils/Singleton.h"
+
+#include <gtest/gtest.h>
+
+#include <atomic>
+#include <optional>
+#include <thread>
+#include <vector>
+
+#include "Support/SyslogCapture.h"
+
+namespace {
+
+struct Plain : utils::Singleton<Plain> {
+    static const char* GetSingletonName() { return "Plain"; }
+};
+
+struct Slow : utils::AutoSingleton<Slow> {
+    Slow() {
+        ++constructed;
+        std::this_thread::yield();
+        isWhole = true;
+    }
+    static const char* GetSingletonName() { return "Slow"; }
+    static std::unique_ptr<Slow> CreateSingleton() { return std::make_unique<Slow>(); }
+    static std::atomic<int> constructed;
+    bool isWhole = false;
+};
+std::atomic<int> Slow::constructed{0};
+
+}  // namespace
+
+TEST(Singleton, InstancesFormAStackAndSayWhoIsCurrent) {
+    const test::LogLevelGuard guard(2);
+    EXPECT_THROW(Plain::getInstance(), utils::Exception);
+    EXPECT_EQ(test::SyslogCapture::messages("error"),
+              std::vector<std::string>{"No singleton instance found for Plain"});
+    test::SyslogCapture::clear();
+    Plain older;
+    {
+        Plain newer;
+        EXPECT_EQ(Plain::getInstance(), &newer);
+    }
+    EXPECT_EQ(Plain::getInstance(), &older);
+    const auto messages = test::SyslogCapture::messages();
+    ASSERT_EQ(messages.size(), 4U);
+    EXPECT_EQ(messages[1], "New singleton instance for Plain");
+    EXPECT_EQ(messages[3], utils::formatStr("Instance of Plain (#%p)", static_cast<void*>(&older)));
+}
+
+TEST(Singleton, DestructionOutOfOrderNeverBringsBackADeadInstance) {
+    const test::LogLevelGuard guard(0);
+    std::optional<Plain> first(std::in_place);
+    std::optional<Plain> second(std::in_place);
+    std::optional<Plain> third(std::in_place);
+    second.reset();
+    EXPECT_EQ(Plain::getInstance(), &*first);  // whoever was current
+    third.reset();
+    EXPECT_EQ(Plain::getInstance(), &*first);
+    first.reset();
+    EXPECT_THROW(Plain::getInstance(), utils::Exception);
+}
+
+TEST(AutoSingleton, TwoFirstCallsMakeOneWholeInstanceThatANewerOneHides) {
+    std::vector<std::thread> threads;
+    for (int i = 0; i < 8; ++i) {
+        threads.emplace_back([] { EXPECT_TRUE(Slow::getInstance()->isWhole); });
+    }
+    for (std::thread& thread : threads)
+        thread.join();
+    EXPECT_EQ(Slow::constructed, 1);
+    Slow* const created = Slow::getInstance();
+    {
+        Slow local;
+        EXPECT_EQ(Slow::getInstance(), &local);
+    }
+    EXPECT_EQ(Slow::getInstance(), created);
+}

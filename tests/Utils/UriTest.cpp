@@ -1,0 +1,73 @@
+#include "Utils/Uri.h"
+
+#include <gtest/gtest.h>
+
+#include "Support/SyslogCapture.h"
+#include "Support/TempFolder.h"
+
+using utils::Uri;
+using Scheme = Uri::SupportedURISchemes;
+
+TEST(Uri, TextsGiveSchemePathAndLogLine) {
+    const test::LogLevelGuard guard(2);
+    const struct {
+        const char* text;
+        Scheme scheme;
+        const char* path;
+        const char* line;  // the message of the debug line, null for none
+    } rows[] = {
+        {"file:///opt/fw/image.bin", Scheme::File, "/opt/fw/image.bin", nullptr},
+        {"FiLe:///x", Scheme::File, "/x", nullptr},
+        {"file://server/x", Scheme::File, "server/x", nullptr},
+        {"file:///a:b::c:", Scheme::File, "/a:b::c:", nullptr},
+        {"file:///a%20b%2F", Scheme::File, "/a%20b%2F", nullptr},
+        {"file:///", Scheme::File, "/", nullptr},
+        {"file://", Scheme::File, "", nullptr},
+        {"https://host:80/x", Scheme::Https, "host:80/x", nullptr},
+        {"data://x", Scheme::Data, "x", nullptr},
+        {"ftp://x", Scheme::Ftp, "x", nullptr},
+        {"http://x", Scheme::Http, "x", nullptr},
+        {"nfs://x", Scheme::Nfs, "x", nullptr},
+        {"tftp://x", Scheme::Tftp, "x", nullptr},
+        {"file:/x", Scheme::Unknown, "", "Uknown URI format of 'file:/x'"},
+        {"file:/", Scheme::Unknown, "", "Uknown URI format of 'file:/'"},
+        {"file:", Scheme::Unknown, "", "Uknown URI format of 'file:'"},
+        {"://x", Scheme::Unknown, "", "Uknown URI format of '://x'"},
+        {"::", Scheme::Unknown, "", "Uknown URI format of '::'"},
+        {" file:///x", Scheme::Unknown, "", "Uknown URI format of ' file:///x'"},
+        {"files:///x", Scheme::Unknown, "", "Uknown URI format of 'files:///x'"},
+        {"/opt/%n%s", Scheme::Unknown, "", "Incorrect URI format of '/opt/%n%s'"},
+        {"", Scheme::Unknown, "", nullptr},
+    };
+    for (const auto& row : rows) {
+        test::SyslogCapture::clear();
+        const Uri uri(row.text);
+        SCOPED_TRACE(row.text);
+        EXPECT_EQ(uri.getScheme(), row.scheme);
+        EXPECT_EQ(uri.getSourcePath(), row.path);
+        EXPECT_EQ(uri.IsUriSupported(), row.scheme == Scheme::File);
+        std::vector<std::string> expected;
+        if (row.line != nullptr) expected.emplace_back(row.line);
+        EXPECT_EQ(test::SyslogCapture::messages(), expected);
+    }
+    EXPECT_EQ(static_cast<int>(Scheme::Https), 6);
+}
+
+TEST(Uri, AMalformedTextKeepsThePath) {
+    const test::LogLevelGuard guard(0);
+    Uri uri("file:///x");
+    uri.parseUri("nonsense");
+    EXPECT_FALSE(uri.IsUriSupported());
+    EXPECT_EQ(uri.getSourcePath(), "/x");
+}
+
+TEST(Uri, OnlyLocalFilesThatHaveASizeAreAccessible) {
+    const test::LogLevelGuard guard(0);
+    const test::TempFolder folder;
+    const std::string file = folder.write("a:b.rom", "x");
+    EXPECT_TRUE(Uri("file://" + file).IsUriAccesible());
+    EXPECT_FALSE(Uri("file://" + file + "-").IsUriAccesible());
+    EXPECT_FALSE(Uri("file://" + folder.path()).IsUriAccesible());
+    EXPECT_FALSE(Uri("https://" + file).IsUriAccesible());
+    EXPECT_FALSE(Uri(file).IsUriAccesible());
+}
