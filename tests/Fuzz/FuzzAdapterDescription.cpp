@@ -1,7 +1,6 @@
 #include <string>
 #include <string_view>
 
-#include "Fuzz/Quiet.h"
 #include "Fuzz/Require.h"
 #include "MidAPI/AdapterError.h"
 #include "MidAPI/Simulator/Simulator.h"
@@ -22,11 +21,6 @@ void useAdapters(std::vector<ma::AdapterDescription> adapters) {
 }
 
 }  // namespace
-
-extern "C" int LLVMFuzzerInitialize(int*, char***) {
-    beQuiet();
-    return 0;
-}
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
     const std::string text(data, data + size);

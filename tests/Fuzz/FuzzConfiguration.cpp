@@ -3,7 +3,6 @@
 
 #include <string>
 
-#include "Fuzz/Quiet.h"
 #include "Fuzz/Require.h"
 #include "Utils/Os/Linux/SMASHv2Config.h"
 #include "Utils/Os/Linux/linux.h"
@@ -26,11 +25,6 @@ class MemoryFile {
 };
 
 }  // namespace
-
-extern "C" int LLVMFuzzerInitialize(int*, char***) {
-    beQuiet();
-    return 0;
-}
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
     const MemoryFile file(data, size);

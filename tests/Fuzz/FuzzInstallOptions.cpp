@@ -1,6 +1,5 @@
 #include <string>
 
-#include "Fuzz/Quiet.h"
 #include "Fuzz/Require.h"
 #include "Providers/SoftwareUpdate/Quenx_ConcreteJob.h"
 #include "Providers/SoftwareUpdate/UpdateExceptions.h"
@@ -22,11 +21,6 @@ struct Input {
 };
 
 }  // namespace
-
-extern "C" int LLVMFuzzerInitialize(int*, char***) {
-    beQuiet();
-    return 0;
-}
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
     Input input(std::string(data, data + size));

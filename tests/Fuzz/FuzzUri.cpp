@@ -1,14 +1,8 @@
 #include <string>
 
-#include "Fuzz/Quiet.h"
 #include "Fuzz/Require.h"
 #include "Utils/Os/Linux/linux.h"
 #include "Utils/Uri.h"
-
-extern "C" int LLVMFuzzerInitialize(int*, char***) {
-    beQuiet();
-    return 0;
-}
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
     const std::string text(data, data + size);

@@ -3,8 +3,8 @@
 
 #include "Framework/Retirement.h"
 #include "Providers/SoftwareUpdate/UpdateTest.h"
-#include "Reliability/AllocationFaults.h"
 #include "Reliability/Effort.h"
+#include "Reliability/Interposed.h"
 #include "Support/TestRoms.h"
 
 namespace {
@@ -18,14 +18,6 @@ class AllocationTest : public test::UpdateTest {
   protected:
     /// One update, with the n-th allocation failing. False when it was never reached.
     bool failAt(On on, std::uint64_t n, bool releases);
-    void checkClaim(const CallResult& result, bool releases);
-    void deleteJobs() {
-        for (const core::CimPath& job : m_requests.enumerateInstanceNames("Quenx_ConcreteJob")) {
-            waitForEnd(job);
-            m_requests.deleteInstance(job);
-        }
-        core::drainRetired();
-    }
     void failEverywhere(On on, std::uint64_t step, bool releases);
 
     const std::string m_image = goodImage();
@@ -36,16 +28,6 @@ class AllocationTest : public test::UpdateTest {
         test::codesArgument("InstallOptions", {5, 32768}),
         test::textsArgument("InstallOptionsValues", {"", "IMG_PXE+IMG_UEFI"})};
 };
-
-void AllocationTest::checkClaim(const CallResult& result, bool releases) {
-    if (claim().empty()) return;
-    // Kept by a failure that is no refusal, and by nothing else.
-    EXPECT_FALSE(releases);
-    EXPECT_EQ(claim(), "eth0");
-    EXPECT_TRUE(result.returnValue == 2U || !result.error.empty()) << result.returnValue;
-    EXPECT_EQ(call("InstallFromURI", m_arguments).returnValue, 6U);
-    Quenx_ConcreteJob::m_servicedAdapter = std::string();
-}
 
 bool AllocationTest::failAt(On on, std::uint64_t n, bool releases) {
     CallResult result;
@@ -64,7 +46,13 @@ bool AllocationTest::failAt(On on, std::uint64_t n, bool releases) {
         struck = failure.hasStruck();
     }
     deleteJobs();
-    checkClaim(result, releases);
+    if (!claim().empty()) {
+        // Kept by a failure that is no refusal, and by nothing else.
+        EXPECT_FALSE(releases);
+        EXPECT_EQ(claim(), "eth0");
+        EXPECT_TRUE(result.returnValue == 2U || !result.error.empty()) << result.returnValue;
+        setClaim("");
+    }
     const std::string flash = test::describeRom(m_adapters->flashContent("eth0"));
     EXPECT_TRUE(flash == "IMG_PXE 2, IMG_UEFI 1" || flash == m_old) << flash;
     EXPECT_TRUE(struck || result.returnValue == kJobStarted) << result.error;
@@ -86,18 +74,14 @@ void AllocationTest::failEverywhere(On on, std::uint64_t step, bool releases) {
     expectUpdateWorks();
 }
 
-TEST_F(AllocationTest, FailingInTheRequest) {
+TEST_F(AllocationTest, FailingInTheRequestAndInTheWorker) {
     const test::LogLevelGuard silent(0);
     for (const bool releases : {false, true}) {
         SCOPED_TRACE(releases);
         m_folder.write("quenx.conf", releases ? "ReleaseClaimAfterCheck=1\n" : "\n");
         failEverywhere(On::ThisThread, 1, releases);
     }
-}
-
-TEST_F(AllocationTest, FailingInTheWorker) {
-    const test::LogLevelGuard silent(0);
-    failEverywhere(On::OtherThreads, 1, false);
+    failEverywhere(On::OtherThreads, 1, true);
 }
 
 TEST_F(AllocationTest, FailingWhileEverythingIsLogged) {

@@ -11,7 +11,6 @@ namespace {
 
 namespace fs = std::filesystem;
 using test::CallResult;
-using test::madeRom;
 using utils::FirmwareType;
 
 /// Between two steps of an update.
@@ -22,104 +21,89 @@ class ChangingFileTest : public test::UpdateTest {
     ~ChangingFileTest() override { test::SyslogCapture::observe(nullptr); }
 
     /// Has the change made once, when the update gets there.
-    void arrange(When when, std::function<void()> change);
-    std::vector<uint8_t> rom(uint16_t revision) const {
-        return madeRom({{FirmwareType::PXE, revision}, {FirmwareType::UEFI, revision}});
-    }
+    void arrange(When when, const std::function<void()>& change);
     CallResult installAndEnd(const std::string& uri) {
         CallResult result = install(uri, "eth0");
         EXPECT_TRUE(!result.job || state(waitForEnd(*result.job)) == JobStateCompleted);
         return result;
     }
-    std::string revision() const {
-        return test::componentsOf("eth0").substr(std::string("IMG_PXE ").size(), 1);
+    static std::vector<uint8_t> rom(uint16_t revision) {
+        return test::madeRom({{FirmwareType::PXE, revision}, {FirmwareType::UEFI, revision}});
     }
 
     bool m_changed = false;
     int m_sizes = 0;
+    const std::string m_path = m_folder / "image.rom";
 };
 
-void ChangingFileTest::arrange(When when, std::function<void()> change) {
+void ChangingFileTest::arrange(When when, const std::function<void()>& change) {
     m_changed = false;
     m_sizes = 0;
-    const auto once = [this, change = std::move(change)] {
+    const auto once = [this, change] {
         if (!std::exchange(m_changed, true)) change();
     };
-    m_backend->hook = nullptr;
-    test::SyslogCapture::observe(nullptr);
-    if (when == When::BeforePreparation || when == When::BeforeWrite) {
-        const std::string operation = when == When::BeforeWrite ? "writeFlashImage" : "prepareFlashImage";
-        m_backend->hook = [once, operation](const std::string& called, const std::string&) {
-            if (called == operation) once();
-        };
-        return;
-    }
+    m_backend->hook = [=](const std::string& called, const std::string&) {
+        const bool isPreparation = when == When::BeforePreparation && called == "prepareFlashImage";
+        const bool isWrite = when == When::BeforeWrite && called == "writeFlashImage";
+        if (isPreparation || isWrite) once();
+    };
     // The size is asked for twice: to see whether there is a file, and to make room for it. Each says so.
-    const int wanted = when == When::BeforeSize ? 1 : 2;
-    test::SyslogCapture::observe([this, once, wanted](const std::string& line) {
-        if (line.find("Output size of file") != std::string::npos && ++m_sizes == wanted) once();
+    test::SyslogCapture::observe([=, this](const std::string& line) {
+        if (line.find("Output size of file") == std::string::npos) return;
+        ++m_sizes;
+        const bool isFirst = when == When::BeforeSize && m_sizes == 1;
+        const bool isSecond = when == When::BeforeRead && m_sizes == 2;
+        if (isFirst || isSecond) once();
     });
 }
 
 TEST_F(ChangingFileTest, WhatWasReadAndVerifiedIsWrittenWholeOrNothingIs) {
-    struct Change {
-        const char* name;
-        std::function<void(const std::string& path)> make;
-    };
-    const auto replace = [this](const std::string& path, const std::vector<uint8_t>& content) {
-        const std::string other = m_folder.write("other.rom", std::span(content));
-        fs::rename(other, path);
-    };
     auto longer = rom(3);
     longer.resize(longer.size() + 512, 0xEE);
-    const std::vector<Change> changes = {
-        {"truncated", [](const std::string& path) { fs::resize_file(path, 700); }},
-        {"emptied", [](const std::string& path) { fs::resize_file(path, 0); }},
-        {"extended", [](const std::string& path) { fs::resize_file(path, 9000); }},
-        {"replaced", [&](const std::string& path) { replace(path, rom(3)); }},
-        {"replaced by a longer one", [&](const std::string& path) { replace(path, longer); }},
-        {"unlinked", [](const std::string& path) { fs::remove(path); }},
-        {"a FIFO",
-         [](const std::string& path) {
-             fs::remove(path);
-             mkfifo(path.c_str(), 0600);
-         }},
-        {"a device",
-         [](const std::string& path) {
-             fs::remove(path);
-             fs::create_symlink("/dev/zero", path);
-         }},
-        {"a folder",
-         [](const std::string& path) {
-             fs::remove(path);
-             fs::create_directory(path);
-         }},
+    const auto replaceBy = [this](std::vector<uint8_t> content) {
+        return [this, content] { fs::rename(m_folder.write("other.rom", std::span(content)), m_path); };
     };
-    // For each change: the method's answer, and the revision then in the flash. 2K: 2, with the claim kept.
+    const auto inItsPlace = [this](const std::function<void()>& make) {
+        return [this, make] {
+            fs::remove(m_path);
+            make();
+        };
+    };
+    // The method's answer and the revision then in the flash; 2K: 2, with the claim kept.
     struct Row {
-        When when;
-        std::array<const char*, 9> outcomes;
+        const char* change;
+        std::function<void()> make;
+        const char* beforeSize;
+        const char* beforeRead;
     };
     constexpr const char* kOld = "4096/2";
     constexpr const char* kNew = "4096/3";
-    for (const Row& row : {
-             Row{When::BeforeSize, {"5/1", "5/1", kOld, kNew, kNew, "2K/1", "2K/1", "2K/1", "2K/1"}},
-             Row{When::BeforeRead, {"2/1", "2/1", kOld, kNew, kNew, "2/1", "2/1", "2/1", "2/1"}},
-             Row{When::BeforePreparation, {kOld, kOld, kOld, kOld, kOld, kOld, kOld, kOld, kOld}},
-             Row{When::BeforeWrite, {kOld, kOld, kOld, kOld, kOld, kOld, kOld, kOld, kOld}},
+    for (const Row& row : std::vector<Row>{
+             {"truncated", [this] { fs::resize_file(m_path, 700); }, "5/1", "2/1"},
+             {"emptied", [this] { fs::resize_file(m_path, 0); }, "5/1", "2/1"},
+             {"extended", [this] { fs::resize_file(m_path, 9000); }, kOld, kOld},
+             {"replaced", replaceBy(rom(3)), kNew, kNew},
+             {"replaced by a longer one", replaceBy(longer), kNew, kNew},
+             {"unlinked", inItsPlace([] {}), "2K/1", "2/1"},
+             {"a FIFO", inItsPlace([this] { mkfifo(m_path.c_str(), 0600); }), "2K/1", "2/1"},
+             {"a device", inItsPlace([this] { fs::create_symlink("/dev/zero", m_path); }), "2K/1", "2/1"},
+             {"a folder", inItsPlace([this] { fs::create_directory(m_path); }), "2K/1", "2/1"},
          }) {
-        for (std::size_t i = 0; i < changes.size(); ++i) {
-            SCOPED_TRACE(std::string(changes[i].name) + " at step " +
-                         std::to_string(static_cast<int>(row.when)));
-            fs::remove_all(m_folder / "image.rom");
+        for (const When when :
+             {When::BeforeSize, When::BeforeRead, When::BeforePreparation, When::BeforeWrite}) {
+            SCOPED_TRACE(std::string(row.change) + " at step " + std::to_string(static_cast<int>(when)));
+            fs::remove_all(m_path);
             fs::remove_all(m_adapters.stateDirectory());
             const std::string uri = file("image.rom", rom(2));
-            arrange(row.when, [&] { changes[i].make(m_folder / "image.rom"); });
+            arrange(when, row.make);
             const CallResult result = installAndEnd(uri);
             EXPECT_TRUE(m_changed);
-            EXPECT_EQ(std::to_string(result.returnValue) + (claim().empty() ? "/" : "K/") + revision(),
-                      row.outcomes[i]);
-            Quenx_ConcreteJob::m_servicedAdapter = std::string();
+            const std::string outcome = std::to_string(result.returnValue) + (claim().empty() ? "/" : "K/") +
+                                        test::componentsOf("eth0").substr(std::string("IMG_PXE ").size(), 1);
+            EXPECT_EQ(outcome, when == When::BeforeSize   ? row.beforeSize
+                               : when == When::BeforeRead ? row.beforeRead
+                                                          : kOld);
+            setClaim("");
             test::count("files changed on the way");
         }
     }
@@ -129,30 +113,26 @@ TEST_F(ChangingFileTest, OddPathsAreRefusedOrReadLikeAnyOther) {
     const std::string huge = m_folder.write("huge", std::string_view("x"));
     fs::resize_file(huge, 5ULL << 30);
     const std::string good = goodImage();
-    const std::string oddName = file("new\nline %n \x01.rom", test::readTestFile(good.substr(7)));
-    struct Row {
-        std::string uri;
-        unsigned returnValue;
-    };
-    for (const Row& row : std::vector<Row>{
-             {"file:///proc/self/maps", 5},  // says that it is empty
-             {"file:///proc/kcore", 5},
-             {"file:///proc/self/mem", 5},
-             {"file:///dev/null", 5},
-             {"file:///dev/tty", 5},
-             {"file://" + huge, 5},
-             {"file:///" + std::string(5000, 'x'), 5},
-             {"file:///" + std::string(2500, '/') + std::string(2500, '.'), 5},
-             {good + std::string("\0.bak", 5), 5},
-             {std::string("file://\0", 8), 5},
-             {"file://", 5},
-             {"file://\n" + good.substr(7), 5},
-             {oddName, 4096},
+    for (const std::string& uri : {
+             std::string("file:///proc/self/maps"),  // says that it is empty
+             std::string("file:///proc/kcore"),
+             std::string("file:///proc/self/mem"),
+             std::string("file:///dev/null"),
+             std::string("file:///dev/tty"),
+             "file://" + huge,
+             "file:///" + std::string(5000, 'x'),
+             "file:///" + std::string(2500, '/') + std::string(2500, '.'),
+             good + std::string("\0.bak", 5),
+             std::string("file://\0", 8),
+             std::string("file://"),
+             "file://\n" + good.substr(7),
          }) {
-        EXPECT_EQ(installAndEnd(row.uri).returnValue, row.returnValue) << row.uri.substr(0, 80);
-        EXPECT_EQ(claim(), "") << row.uri.substr(0, 80);
+        EXPECT_EQ(installAndEnd(uri).returnValue, 5U) << uri.substr(0, 80);
+        EXPECT_EQ(claim(), "") << uri.substr(0, 80);
         test::count("bad inputs tried");
     }
+    const std::string oddName = file("new\nline %n \x01.rom", test::readTestFile(good.substr(7)));
+    EXPECT_EQ(installAndEnd(oddName).returnValue, 4096U);
     expectUpdateWorks();
 }
 

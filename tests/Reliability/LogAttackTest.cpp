@@ -30,26 +30,24 @@ void LogAttackTest::attack(const std::string& text) const {
         if (c == '"' || c == '\\') quoted += '\\';
         quoted += c;
     }
-    const std::vector<core::CimPath> paths = {
-        core::CimPath("Quenx_EthernetPort.DeviceID=\"" + quoted + "\""),
-        core::CimPath("Quenx_ConcreteJob.InstanceID=\"" + quoted + "\""),
-        core::CimPath("Quenx_SoftwareIdentity.InstanceID=\"" + quoted + "\""),
-        core::CimPath(text),
-    };
     const auto on = [&](const core::CimPath& target, const std::string& uri, const std::string& value) {
         call("InstallFromURI", {test::textArgument("URI", uri), test::pathArgument("Target", target),
                                 test::codesArgument("InstallOptions", {5, 32768}),
                                 test::textsArgument("InstallOptionsValues", {value, value})});
     };
-    attempt([&] { on(port("eth0"), text, "IMG_PXE"); });
-    attempt([&] { on(port("eth0"), "file:///" + text, "IMG_PXE"); });
-    attempt([&] { on(port("eth0"), goodImage(), text); });
-    for (const core::CimPath& path : paths) {
+    const core::CimPath target = port("eth0");
+    attempt([&] { on(target, text, "IMG_PXE"); });
+    attempt([&] { on(target, "file:///" + text, "IMG_PXE"); });
+    attempt([&] { on(target, goodImage(), text); });
+    for (const core::CimPath& path : {
+             core::CimPath("Quenx_EthernetPort.DeviceID=\"" + quoted + "\""),
+             core::CimPath("Quenx_ConcreteJob.InstanceID=\"" + quoted + "\""),
+             core::CimPath("Quenx_SoftwareIdentity.InstanceID=\"" + quoted + "\""),
+             core::CimPath(text),
+         }) {
         attempt([&] { on(path, "file:///x", "IMG_PXE"); });
-        std::vector<core::Argument> identity = {
-            test::pathArgument("Source", path),
-            test::pathArgument("Target", port("eth0")),
-            {"Collection", core::CimValue::null(core::CimType::Reference, false)}};
+        std::vector<core::Argument> identity = {test::pathArgument("Source", path),
+                                                test::pathArgument("Target", target)};
         attempt([&] { call("CheckSoftwareIdentity", identity); });
         identity.push_back(test::codesArgument("InstallOptions", {5}));
         identity.push_back(test::textsArgument("InstallOptionsValues", {text}));

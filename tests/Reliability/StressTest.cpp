@@ -7,11 +7,10 @@
 
 #include "Framework/InstanceRange.h"
 #include "Framework/RequestScope.h"
-#include "Framework/Retirement.h"
 #include "Providers/SoftwareUpdate/JobThread.h"
 #include "Providers/SoftwareUpdate/UpdateTest.h"
-#include "Reliability/AllocationFaults.h"
 #include "Reliability/Effort.h"
+#include "Reliability/Interposed.h"
 #include "Support/TestRoms.h"
 
 namespace {
@@ -51,8 +50,7 @@ class StressTest : public test::UpdateTest {
 
     /// Lets the clients act for this time, and on until it is enough.
     void run(std::chrono::milliseconds time, const std::function<bool()>& isEnough);
-    void deleteEverything();
-    std::uint64_t started() const { return m_started; }
+    void cleanUp();
 
     const std::shared_ptr<WatchingBackend> m_watching = std::make_shared<WatchingBackend>(m_backend);
     std::atomic<std::uint64_t> m_requestCount{0};
@@ -80,29 +78,21 @@ class StressTest : public test::UpdateTest {
     struct Target {
         const char* adapter;
         std::string uri;
-        CimPath port;
     };
 
     const test::LogLevelGuard m_silent{0};
     std::vector<Target> m_targets;
     std::vector<std::string> m_classes;
-    CimPath m_service;
     std::atomic<bool> m_stop{false};
 };
 
 StressTest::StressTest() {
-    const std::string uri = goodImage();
-    m_targets = {
-        {"eth0", uri, port("eth0")},
-        {"eth1", uri, port("eth1")},
-        {"eth2",
-         file("rtl.rom", test::madeRom({{FirmwareType::PXE, 1}, {FirmwareType::UEFI, 1}}, 0x10ec, 0x8139)),
-         port("eth2")},
-        {"eth4",
-         file("vmx.rom", test::madeRom({{FirmwareType::iSCSI, 1}, {FirmwareType::UEFI, 0}}, 0x15ad, 0x07b0)),
-         port("eth4")},
-    };
-    m_service = service();
+    const auto rtl = test::madeRom({{FirmwareType::PXE, 1}, {FirmwareType::UEFI, 1}}, 0x10ec, 0x8139);
+    const auto vmx = test::madeRom({{FirmwareType::iSCSI, 1}, {FirmwareType::UEFI, 0}}, 0x15ad, 0x07b0);
+    m_targets = {{"eth0", goodImage()},
+                 {"eth1", goodImage()},
+                 {"eth2", file("rtl.rom", rtl)},
+                 {"eth4", file("vmx.rom", vmx)}};
     for (const core::ClassDeclaration& declaration : m_requests.enumerateClasses("", true))
         m_classes.push_back(declaration.name);
     ma::setBackend(m_watching);
@@ -124,10 +114,7 @@ void StressTest::walk(Random& random) const {
 
 void StressTest::startInstall(Random& random) {
     const Target& target = pick(m_targets, random);
-    const CallResult result = call(
-        "InstallFromURI",
-        {test::textArgument("URI", target.uri), test::pathArgument("Target", target.port),
-         test::codesArgument("InstallOptions", {5, 3}), test::textsArgument("InstallOptionsValues", {})});
+    const CallResult result = install(target.uri, target.adapter, {5, 3});
     EXPECT_EQ(result.error, "");
     if (result.job) {
         ++m_started;
@@ -143,10 +130,9 @@ void StressTest::startInstall(Random& random) {
 void StressTest::check(Random& random) {
     const auto sources = m_requests.enumerateInstanceNames("Quenx_SoftwareIdentity");
     if (sources.empty()) return;
-    const CallResult result = call("CheckSoftwareIdentity",
-                                   {test::pathArgument("Source", pick(sources, random)),
-                                    test::pathArgument("Target", pick(m_targets, random).port),
-                                    {"Collection", core::CimValue::null(core::CimType::Reference, false)}});
+    const CallResult result =
+        call("CheckSoftwareIdentity", {test::pathArgument("Source", pick(sources, random)),
+                                       test::pathArgument("Target", port(pick(m_targets, random).adapter))});
     EXPECT_EQ(result.error, "");
     if (result.returnValue == 0) ++m_checked;
 }
@@ -215,23 +201,18 @@ void StressTest::run(std::chrono::milliseconds time, const std::function<bool()>
         thread.join();
 }
 
-void StressTest::deleteEverything() {
-    for (const CimPath& job : m_requests.enumerateInstanceNames("Quenx_ConcreteJob")) {
-        EXPECT_TRUE(hasEnded(waitForEnd(job)));
-        m_requests.deleteInstance(job);
-    }
-    // Deleted while they ran: they end all the same.
-    core::drainRetired();
+void StressTest::cleanUp() {
+    deleteJobs();
     // What the rebuilt association classes hold, is what is there without jobs.
-    for (const core::ClassDeclaration& declaration : m_requests.enumerateClasses("", true))
-        m_requests.enumerateInstances(declaration.name);
+    for (const std::string& name : m_classes)
+        m_requests.enumerateInstances(name);
 }
 
 TEST_F(StressTest, LosesNothing) {
     m_folder.write("quenx.conf", "ReleaseClaimAfterCheck=1\nFWFilePath=" + m_folder.path() + "\n");
     const std::int32_t executionsBefore = JobThread::executionCount;
     run(std::chrono::milliseconds(300), [&] { return m_started >= 10; });
-    deleteEverything();
+    cleanUp();
     const std::int64_t before = test::liveBytes();
 
     const std::uint64_t wanted = m_started + test::effort().jobs;
@@ -245,7 +226,7 @@ TEST_F(StressTest, LosesNothing) {
              core::InstanceRange(core::GetCimBroker()->getInstances("Quenx_ConcreteJob", "")))
             jobs.push_back(each->weak_from_this());
     }
-    deleteEverything();
+    cleanUp();
     for (const auto& job : jobs)
         EXPECT_TRUE(job.expired());
     jobs = {};
@@ -270,7 +251,7 @@ TEST_F(StressTest, LosesNothing) {
 TEST_F(StressTest, WithoutReleaseACheckShutsUpdatesOut) {
     const std::chrono::milliseconds time = test::effort().stress / 4;
     run(time, [&] { return m_checked > 0; });
-    deleteEverything();
+    cleanUp();
     // Nothing that ran then gave the claim back.
     const std::string holder = claim();
     ASSERT_NE(holder, "");

@@ -8,61 +8,28 @@ const std::vector<SchemaRow>& schemaTable() {
         {"CIM_ManagedSystemElement", "CIM_ManagedElement",
          "+InstallDate:Datetime +Name:String +OperationalStatus:Uint16_arr "
          "+StatusDescriptions:String_arr +Status:String +HealthState:Uint16 +CommunicationStatus:Uint16 "
-         "+DetailedStatus:Uint16 +OperatingStatus:Uint16 +PrimaryStatus:Uint16 InstanceID:String "
-         "Caption:String Description:String ElementName:String Generation:Uint64"},
-        {"CIM_LogicalElement", "CIM_ManagedSystemElement",
-         "InstallDate:Datetime Name:String OperationalStatus:Uint16_arr StatusDescriptions:String_arr "
-         "Status:String HealthState:Uint16 CommunicationStatus:Uint16 DetailedStatus:Uint16 "
-         "OperatingStatus:Uint16 PrimaryStatus:Uint16 InstanceID:String Caption:String "
-         "Description:String ElementName:String Generation:Uint64"},
+         "+DetailedStatus:Uint16 +OperatingStatus:Uint16 +PrimaryStatus:Uint16 ..."},
+        {"CIM_LogicalElement", "CIM_ManagedSystemElement", "..."},
         {"CIM_Job", "CIM_LogicalElement",
          "+JobStatus:String +TimeSubmitted:Datetime +ScheduledStartTime:Datetime +StartTime:Datetime "
          "+ElapsedTime:Datetime +JobRunTimes:Uint32 +RunMonth:Uint8 +RunDay:Sint8 +RunDayOfWeek:Sint8 "
          "+RunStartInterval:Datetime +LocalOrUtcTime:Uint16 +UntilTime:Datetime +Notify:String "
          "+Owner:String +Priority:Uint32 +PercentComplete:Uint16 +DeleteOnCompletion:Boolean "
          "+ErrorCode:Uint16 +ErrorDescription:String +RecoveryAction:Uint16 +OtherRecoveryAction:String "
-         "InstallDate:Datetime Name:String OperationalStatus:Uint16_arr StatusDescriptions:String_arr "
-         "Status:String HealthState:Uint16 CommunicationStatus:Uint16 DetailedStatus:Uint16 "
-         "OperatingStatus:Uint16 PrimaryStatus:Uint16 InstanceID:String Caption:String "
-         "Description:String ElementName:String Generation:Uint64"},
+         "..."},
         {"CIM_ConcreteJob", "CIM_Job",
          "+InstanceID:String* Name:String +JobState:Uint16 +TimeOfLastStateChange:Datetime "
          "+TimeBeforeRemoval:Datetime +JobInParameters:String +JobOutParameters:String "
-         "+MethodName:String JobStatus:String TimeSubmitted:Datetime ScheduledStartTime:Datetime "
-         "StartTime:Datetime ElapsedTime:Datetime JobRunTimes:Uint32 RunMonth:Uint8 RunDay:Sint8 "
-         "RunDayOfWeek:Sint8 RunStartInterval:Datetime LocalOrUtcTime:Uint16 UntilTime:Datetime "
-         "Notify:String Owner:String Priority:Uint32 PercentComplete:Uint16 DeleteOnCompletion:Boolean "
-         "ErrorCode:Uint16 ErrorDescription:String RecoveryAction:Uint16 OtherRecoveryAction:String "
-         "InstallDate:Datetime OperationalStatus:Uint16_arr StatusDescriptions:String_arr Status:String "
-         "HealthState:Uint16 CommunicationStatus:Uint16 DetailedStatus:Uint16 OperatingStatus:Uint16 "
-         "PrimaryStatus:Uint16 Caption:String Description:String ElementName:String Generation:Uint64"},
+         "+MethodName:String ..."},
         {"CIM_EnabledLogicalElement", "CIM_LogicalElement",
          "+EnabledState:Uint16 +OtherEnabledState:String +RequestedState:Uint16 +EnabledDefault:Uint16 "
          "+TimeOfLastStateChange:Datetime +AvailableRequestedStates:Uint16_arr "
-         "+TransitioningToState:Uint16 InstallDate:Datetime Name:String OperationalStatus:Uint16_arr "
-         "StatusDescriptions:String_arr Status:String HealthState:Uint16 CommunicationStatus:Uint16 "
-         "DetailedStatus:Uint16 OperatingStatus:Uint16 PrimaryStatus:Uint16 InstanceID:String "
-         "Caption:String Description:String ElementName:String Generation:Uint64"},
+         "+TransitioningToState:Uint16 ..."},
         {"CIM_Service", "CIM_EnabledLogicalElement",
          "+SystemCreationClassName:String* +SystemName:String* +CreationClassName:String* +Name:String* "
-         "+PrimaryOwnerName:String +PrimaryOwnerContact:String +StartMode:String +Started:Boolean "
-         "EnabledState:Uint16 OtherEnabledState:String RequestedState:Uint16 EnabledDefault:Uint16 "
-         "TimeOfLastStateChange:Datetime AvailableRequestedStates:Uint16_arr TransitioningToState:Uint16 "
-         "InstallDate:Datetime OperationalStatus:Uint16_arr StatusDescriptions:String_arr Status:String "
-         "HealthState:Uint16 CommunicationStatus:Uint16 DetailedStatus:Uint16 OperatingStatus:Uint16 "
-         "PrimaryStatus:Uint16 InstanceID:String Caption:String Description:String ElementName:String "
-         "Generation:Uint64"},
-        {"CIM_SoftwareInstallationService", "CIM_Service",
-         "SystemCreationClassName:String* SystemName:String* CreationClassName:String* Name:String* "
-         "PrimaryOwnerName:String PrimaryOwnerContact:String StartMode:String Started:Boolean "
-         "EnabledState:Uint16 OtherEnabledState:String RequestedState:Uint16 EnabledDefault:Uint16 "
-         "TimeOfLastStateChange:Datetime AvailableRequestedStates:Uint16_arr TransitioningToState:Uint16 "
-         "InstallDate:Datetime OperationalStatus:Uint16_arr StatusDescriptions:String_arr Status:String "
-         "HealthState:Uint16 CommunicationStatus:Uint16 DetailedStatus:Uint16 OperatingStatus:Uint16 "
-         "PrimaryStatus:Uint16 InstanceID:String Caption:String Description:String ElementName:String "
-         "Generation:Uint64"},
-        {"CIM_Capabilities", "CIM_ManagedElement",
-         "+InstanceID:String* ElementName:String Caption:String Description:String Generation:Uint64"},
+         "+PrimaryOwnerName:String +PrimaryOwnerContact:String +StartMode:String +Started:Boolean ..."},
+        {"CIM_SoftwareInstallationService", "CIM_Service", "..."},
+        {"CIM_Capabilities", "CIM_ManagedElement", "+InstanceID:String* ElementName:String ..."},
         {"CIM_SoftwareInstallationServiceCapabilities", "CIM_Capabilities",
          "+SupportedAsynchronousActions:Uint16_arr +SupportedSynchronousActions:Uint16_arr "
          "+SupportedTargetTypes:String_arr +SupportedExtendedResourceTypes:Uint16_arr "
@@ -71,21 +38,14 @@ const std::vector<SchemaRow>& schemaTable() {
          "+SupportedExtendedResourceTypesMajorVersions:Uint16_arr "
          "+SupportedExtendedResourceTypesMinorVersions:Uint16_arr "
          "+SupportedExtendedResourceTypesRevisionNumbers:Uint16_arr "
-         "+SupportedExtendedResourceTypesBuildNumbers:Uint16_arr +SupportedURISchemes:Uint16_arr "
-         "InstanceID:String* ElementName:String Caption:String Description:String Generation:Uint64"},
+         "+SupportedExtendedResourceTypesBuildNumbers:Uint16_arr +SupportedURISchemes:Uint16_arr ..."},
         {"CIM_RegisteredSpecification", "CIM_ManagedElement",
          "+InstanceID:String* +SpecificationType:Uint16 +OtherSpecificationType:String "
          "+RegisteredOrganization:Uint16 +OtherRegisteredOrganization:String +RegisteredName:String "
-         "+RegisteredVersion:String +AdvertiseTypes:Uint16_arr +AdvertiseTypeDescriptions:String_arr "
-         "Caption:String Description:String ElementName:String Generation:Uint64"},
+         "+RegisteredVersion:String +AdvertiseTypes:Uint16_arr +AdvertiseTypeDescriptions:String_arr ..."},
         {"CIM_RegisteredProfile", "CIM_RegisteredSpecification",
-         "SpecificationType:Uint16 +ImplementedFeatures:String_arr InstanceID:String* "
-         "OtherSpecificationType:String RegisteredOrganization:Uint16 OtherRegisteredOrganization:String "
-         "RegisteredName:String RegisteredVersion:String AdvertiseTypes:Uint16_arr "
-         "AdvertiseTypeDescriptions:String_arr Caption:String Description:String ElementName:String "
-         "Generation:Uint64"},
-        {"CIM_Dependency", "",
-         "+Antecedent:>CIM_ManagedElement* +Dependent:>CIM_ManagedElement*"},
+         "SpecificationType:Uint16 +ImplementedFeatures:String_arr ..."},
+        {"CIM_Dependency", "", "+Antecedent:>CIM_ManagedElement* +Dependent:>CIM_ManagedElement*"},
         {"CIM_ReferencedSpecification", "CIM_Dependency",
          "+Antecedent:>CIM_RegisteredSpecification* +Dependent:>CIM_RegisteredSpecification*"},
         {"CIM_ReferencedProfile", "CIM_ReferencedSpecification",
@@ -93,12 +53,10 @@ const std::vector<SchemaRow>& schemaTable() {
         {"CIM_AffectedJobElement", "",
          "+AffectedElement:>CIM_ManagedElement* +AffectingElement:>CIM_Job* +ElementEffects:Uint16_arr "
          "+OtherElementEffectsDescriptions:String_arr"},
-        {"CIM_OwningJobElement", "",
-         "+OwningElement:>CIM_ManagedElement* +OwnedElement:>CIM_Job*"},
+        {"CIM_OwningJobElement", "", "+OwningElement:>CIM_ManagedElement* +OwnedElement:>CIM_Job*"},
         {"CIM_ServiceAffectsElement", "",
          "+AffectedElement:>CIM_ManagedElement* +AffectingElement:>CIM_Service* "
-         "+ElementEffects:Uint16_arr +OtherElementEffectsDescriptions:String_arr "
-         "+AssignedSequence:Uint16"},
+         "+ElementEffects:Uint16_arr +OtherElementEffectsDescriptions:String_arr +AssignedSequence:Uint16"},
         {"CIM_ElementCapabilities", "",
          "+ManagedElement:>CIM_ManagedElement* +Capabilities:>CIM_Capabilities* "
          "+Characteristics:Uint16_arr"},
@@ -126,8 +84,7 @@ const std::vector<SchemaRow>& schemaTable() {
         {"CIM_Controller", "CIM_LogicalDevice",
          "+TimeOfLastReset:Datetime +ProtocolSupported:Uint16 +MaxNumberControlled:Uint32 "
          "+ProtocolDescription:String ..."},
-        {"CIM_PortController", "CIM_Controller",
-         "+ControllerType:Uint16 +OtherControllerType:String ..."},
+        {"CIM_PortController", "CIM_Controller", "+ControllerType:Uint16 +OtherControllerType:String ..."},
         {"CIM_SoftwareIdentity", "CIM_LogicalElement",
          "+InstanceID:String* +MajorVersion:Uint16 +MinorVersion:Uint16 +RevisionNumber:Uint16 "
          "+BuildNumber:Uint16 +VersionString:String +TargetOperatingSystems:String_arr "

@@ -69,7 +69,23 @@ unsigned UpdateClient::number(const core::InstanceValue& instance, const char* p
 std::string UpdateClient::text(const core::InstanceValue& instance, const char* property) {
     const core::PropertyValue* found = instance.find(property);
     if (found == nullptr || found->value.isNull()) return {};
-    return core::scalarText(found->value.type, *found->value.scalar());
+    if (!found->value.isArray) return core::scalarText(found->value.type, *found->value.scalar());
+    std::string joined;
+    for (const CimScalar& element : *found->value.elements())
+        joined += (joined.empty() ? "" : ", ") + core::scalarText(found->value.type, element);
+    return joined;
+}
+
+std::vector<std::string> UpdateClient::table(const std::string& className,
+                                             const std::vector<const char*>& properties) const {
+    std::vector<std::string> rows;
+    for (const core::InstanceValue& instance : m_requests.enumerateInstances(className)) {
+        std::string row;
+        for (const char* property : properties)
+            row += (property == properties.front() ? "" : "; ") + text(instance, property);
+        rows.push_back(row);
+    }
+    return rows;
 }
 
 Argument pathArgument(const char* name, const core::CimPath& path) {

@@ -40,7 +40,11 @@ class UpdateClient {
     static unsigned state(const core::InstanceValue& job) { return number(job, "JobState"); }
     static bool hasEnded(const core::InstanceValue& job);
     static unsigned number(const core::InstanceValue& instance, const char* property);
+    /// A property as text, an array's elements joined by ", "; empty when it is null or not there.
     static std::string text(const core::InstanceValue& instance, const char* property);
+    /// For each instance of the class, the properties' texts, separated by "; ".
+    std::vector<std::string> table(const std::string& className,
+                                   const std::vector<const char*>& properties) const;
 
     core::CimRequests m_requests{"root/cimv2"};
 };

@@ -2,6 +2,7 @@
 
 #include <algorithm>
 
+#include "Framework/Retirement.h"
 #include "Support/TestRoms.h"
 
 namespace test {
@@ -13,7 +14,7 @@ UpdateTest::UpdateTest()
       m_inventory(QUENX_INVENTORY_LIBRARY) {
     ma::setBackend(m_backend);
     m_agent = std::make_unique<core::SoftwareUpdateAgent>();
-    Quenx_ConcreteJob::m_servicedAdapter = std::string();
+    setClaim("");
 }
 
 UpdateTest::~UpdateTest() {
@@ -25,6 +26,15 @@ void UpdateTest::expectUpdateWorks() const {
     ASSERT_EQ(result.returnValue, 4096U) << result.error;
     EXPECT_EQ(state(waitForEnd(*result.job)), JobStateCompleted);
     EXPECT_EQ(claim(), "");
+}
+
+void UpdateTest::deleteJobs() const {
+    for (const core::CimPath& job : m_requests.enumerateInstanceNames("Quenx_ConcreteJob")) {
+        EXPECT_TRUE(hasEnded(waitForEnd(job)));
+        m_requests.deleteInstance(job);
+    }
+    // Deleted while they ran: they end all the same.
+    core::drainRetired();
 }
 
 std::string UpdateTest::file(const std::string& name, const std::vector<uint8_t>& content) const {

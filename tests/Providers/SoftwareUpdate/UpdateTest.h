@@ -28,6 +28,8 @@ class UpdateTest : public ::testing::Test, public UpdateClient {
 
     /// Installs an image that suits eth0, and expects state 7.
     void expectUpdateWorks() const;
+    /// Deletes all jobs, each at its end, and waits until none is left in memory.
+    void deleteJobs() const;
 
     /// Writes a file and gives its URI.
     std::string file(const std::string& name, const std::vector<uint8_t>& content) const;
@@ -35,6 +37,7 @@ class UpdateTest : public ::testing::Test, public UpdateClient {
     std::string goodImage() const;
 
     static std::string claim() { return Quenx_ConcreteJob::m_servicedAdapter.get(); }
+    static void setClaim(const std::string& adapter) { Quenx_ConcreteJob::m_servicedAdapter = adapter; }
     static bool logged(const std::string& message);
 
     TempFolder m_folder;

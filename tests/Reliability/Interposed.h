@@ -1,5 +1,6 @@
 #pragma once
 
+#include <atomic>
 #include <cstdint>
 
 namespace test {
@@ -20,5 +21,8 @@ class AllocationFailure {
     /// False when fewer than n allocations were asked for.
     bool hasStruck() const;
 };
+
+/// While it is set, every new thread of the process is refused with EAGAIN.
+extern std::atomic<bool> refusesThreads;
 
 }  // namespace test

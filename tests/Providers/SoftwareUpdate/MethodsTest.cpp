@@ -1,0 +1,369 @@
+// The three methods on one inventory: the files of the test's folder are the identities.
+#include <gtest/gtest.h>
+#include <sys/stat.h>
+
+#include <algorithm>
+#include <filesystem>
+#include <set>
+
+#include "Providers/SoftwareUpdate/UpdateTest.h"
+#include "Support/ChildProcess.h"
+#include "Support/TestRoms.h"
+
+namespace {
+
+using core::Argument;
+using core::CimPath;
+using test::CallResult;
+using test::madeRom;
+using utils::FirmwareType;
+using Codes = std::vector<unsigned short>;
+using Texts = std::vector<std::string>;
+
+constexpr const char* kCheck = "CheckSoftwareIdentity";
+constexpr unsigned kJobStarted = 4096;
+constexpr unsigned kThrows = ~0U;
+
+/// A call that is still to be made.
+struct Call {
+    std::string method;
+    std::vector<Argument> arguments;
+
+    Call without(const std::string& name) const {
+        Call changed = *this;
+        std::erase_if(changed.arguments, [&](const Argument& argument) { return argument.name == name; });
+        return changed;
+    }
+    Call withNull(const std::string& name) const {
+        Call changed = *this;
+        for (Argument& argument : changed.arguments)
+            if (argument.name == name) argument.value.data = std::monostate();
+        return changed;
+    }
+};
+
+/// An argument that is null where the path is none.
+Argument optionalPath(const char* name, const CimPath& path) {
+    if (path.isValid()) return test::pathArgument(name, path);
+    return {name, core::CimValue::null(core::CimType::Reference)};
+}
+
+Call fromUri(const std::string& uri, const CimPath& target, const Codes& options = {5},
+             const Texts& values = {}) {
+    return {"InstallFromURI",
+            {test::textArgument("URI", uri), test::pathArgument("Target", target),
+             test::codesArgument("InstallOptions", options),
+             test::textsArgument("InstallOptionsValues", values)}};
+}
+
+Call check(const CimPath& source, const CimPath& target, const CimPath& collection = {}) {
+    return {kCheck,
+            {optionalPath("Source", source), optionalPath("Target", target),
+             optionalPath("Collection", collection)}};
+}
+
+Call fromIdentity(const CimPath& source, const CimPath& target, const CimPath& collection = {},
+                  const Codes& options = {5}) {
+    return {"InstallFromSoftwareIdentity",
+            {test::codesArgument("InstallOptions", options), test::textsArgument("InstallOptionsValues", {}),
+             optionalPath("Source", source), optionalPath("Target", target),
+             optionalPath("Collection", collection)}};
+}
+
+class MethodsTest : public test::UpdateTest {
+  protected:
+    struct Row {
+        Call call;
+        unsigned returnValue;
+        Texts lines{};          ///< what is logged, or the text of the exception; none when nothing is
+        std::string claimed{};  ///< the adapter that was claimed before
+    };
+    std::vector<Row> argumentRows() const;
+    std::vector<Row> uriRows() const;
+    std::vector<Row> resolutionRows() const;
+    void expect(const Row& row) const;
+
+    CimPath identityOf(const std::string& uri) const;
+    CallResult make(const Call& made) const { return call(made.method, made.arguments); }
+    /// The return value, with the job ended and the claim given back.
+    unsigned outcome(const Call& made) const {
+        const CallResult result = make(made);
+        if (result.job) waitForEnd(*result.job);
+        setClaim("");
+        return result.returnValue;
+    }
+
+    const std::string m_uri = goodImage();
+    const CimPath m_image = identityOf(m_uri);
+    const CimPath m_port = port("eth0");
+    const CimPath m_controller = m_requests.enumerateInstanceNames("Quenx_PortController").at(0);
+};
+
+CimPath MethodsTest::identityOf(const std::string& uri) const {
+    for (const core::InstanceValue& resource :
+         m_requests.enumerateInstances("Quenx_SoftwareIdentityResource")) {
+        if (text(resource, "AccessInfo") != uri) continue;
+        const std::string id = text(resource, "InstanceID");
+        for (const CimPath& identity : m_requests.enumerateInstanceNames("Quenx_SoftwareIdentity")) {
+            if (id.starts_with(std::get<std::string>(identity.getKeys().at(0).value) + "@")) return identity;
+        }
+    }
+    ADD_FAILURE() << "no identity for " << uri;
+    return {};
+}
+
+void MethodsTest::expect(const Row& row) const {
+    SCOPED_TRACE(row.call.method + (row.lines.empty() ? "" : ": " + row.lines[0]));
+    test::SyslogCapture::clear();
+    setClaim(row.claimed);
+    const CallResult result = make(row.call);
+    const bool throws = row.returnValue == kThrows;
+    EXPECT_EQ(result.error, throws ? "SMASHv2:" + row.lines.at(0) : "");
+    EXPECT_TRUE(throws || result.returnValue == row.returnValue) << result.returnValue;
+    for (const std::string& line : row.lines)
+        EXPECT_TRUE(test::SyslogCapture::contains("\"" + line + "\" (")) << line;
+    const bool isSilent = row.lines.empty() && row.returnValue != kJobStarted;
+    EXPECT_FALSE(isSilent && test::SyslogCapture::contains("Firmware Update"));
+
+    const bool isGoodCheck = row.call.method == kCheck && row.returnValue == 0;
+    EXPECT_EQ(result.characteristics == Codes{7}, isGoodCheck);
+    EXPECT_EQ(result.job.has_value(), row.returnValue == kJobStarted);
+    if (result.job) {
+        EXPECT_EQ(state(waitForEnd(*result.job)), JobStateCompleted);
+        m_requests.deleteInstance(*result.job);
+    }
+    EXPECT_EQ(claim(), isGoodCheck ? "eth0" : row.claimed);
+    EXPECT_TRUE(m_requests.enumerateInstances("Quenx_ConcreteJob").empty());
+}
+
+std::vector<MethodsTest::Row> MethodsTest::argumentRows() const {
+    const std::string error = "EUnspecifiedError:";
+    const std::string neither = error + "Neither Target nor Collection are defined";
+    const std::string wrongInput =
+        "InstallCharacterisitcs argument is an output method's argument. Any input value is not supported.";
+    const Call uriCall = fromUri(m_uri, m_port);
+    Call given = check(m_image, m_port);
+    given.arguments.push_back(test::codesArgument("InstallCharacteristics", {1}));
+    std::vector<Row> rows = {
+        {uriCall.without("InstallOptionsValues"), kJobStarted},
+        {uriCall.withNull("InstallOptionsValues"), kJobStarted},
+        {check(m_image, m_port, m_port), kThrows, {error + "Both Target and Collection are defined"}},
+        {fromIdentity(m_image, m_port, m_port), kThrows, {error + "Target and Collection are defined"}},
+        {check(m_image, {}), kThrows, {neither}},
+        {fromIdentity(m_image, {}), kThrows, {neither}},
+        {check(m_image, {}, m_port), 4108},
+        {fromIdentity(m_image, {}, m_port), 4108},
+        {given, 5, {wrongInput}},
+        {fromIdentity(m_image, m_port, {}, {3}),
+         5,
+         {"One of value of InstallOptions value is not supported"}},
+        {fromUri(m_uri, m_port, {5, 0, 1, 13, 65535}), kJobStarted},  // nothing here knows these
+    };
+    for (const Codes& options : std::vector<Codes>{{}, {3}, {32768}, {4, 5}, {5, 3, 12}})
+        rows.push_back({fromUri("file:///nowhere", m_port, options), 5});
+    const std::vector<std::pair<Call, Texts>> required = {
+        {uriCall, {"URI", "Target", "InstallOptions"}},
+        {check(m_image, m_port), {"Source"}},
+        {fromIdentity(m_image, m_port), {"InstallOptions", "Source"}},
+    };
+    for (const auto& [complete, names] : required) {
+        for (const std::string& name : names) {
+            rows.push_back({complete.without(name), kThrows, {error + "Expected " + name + " argument"}});
+            rows.push_back({complete.withNull(name),
+                            kThrows,
+                            {error + name + " argument is set to NULL. It is not allowed"}});
+        }
+    }
+    return rows;
+}
+
+std::vector<MethodsTest::Row> MethodsTest::uriRows() const {
+    const std::string target = "'" + m_port.toString() + "'";
+    const std::string invalid = "Invalid URI for " + target;
+    const std::string missing = "URI does not exists for " + target;
+    const std::string parameter = "Job creation returned Invalid Parameter for " + target;
+    const std::string unsupported = "Target is not supported by service for " + target;
+    const std::string downgrade =
+        "Downgrade is not supported by service for " + target + ". Execute with FORCE INSTALL flag.";
+    mkfifo((m_folder / "fifo").c_str(), 0600);
+    const std::string huge = m_folder.write("huge", std::string_view("x"));
+    std::filesystem::resize_file(huge, 1ULL << 31);
+    auto cut = madeRom({{FirmwareType::PXE, 2}, {FirmwareType::UEFI, 1}});
+    cut.resize(1500);
+    const auto older = madeRom({{FirmwareType::PXE, 0}, {FirmwareType::UEFI, 0}});
+    const auto typed = [&](const char* types) { return fromUri(m_uri, m_port, {32768, 5}, {types}); };
+    return {
+        {fromUri("/no/scheme", m_port), 5, {invalid}},
+        {fromUri("file:/one/slash", m_port), 5, {invalid}},
+        {fromUri("https://host/image", m_port), 5, {invalid}},
+        {fromUri("file://" + m_folder.path(), m_port), 5, {missing}},
+        {fromUri("file:///missing", m_port), 5, {missing}},
+        {fromUri("file://" + (m_folder / "fifo"), m_port), 5, {missing}},
+        {fromUri("file:///dev/zero", m_port), 5, {missing}},
+        {fromUri("file://" + huge, m_port), 5, {missing}},
+        {fromUri(file("empty", {}), m_port), 5, {parameter}},
+        {fromUri(file("cut", cut), m_port), 5, {parameter}},
+        {fromUri("file://" + test::realRomPath("efi-rtl8139"), m_port), 4097, {unsupported}},
+        {fromUri(file("older", older), m_port), 4099, {downgrade}},
+        {typed("img_pxe"), 5, {parameter}},
+        {typed("IMG_PXE+IMG_NO"), 5, {parameter}},
+        {typed("IMG_FCoE"), 4106, {"Not applicable for target for " + target + " "}},
+    };
+}
+
+std::vector<MethodsTest::Row> MethodsTest::resolutionRows() const {
+    const CimPath missing(std::string("Quenx_SoftwareIdentity.InstanceID=\"Quenx:none\""));
+    const CimPath nowhere(std::string("Quenx_EthernetPort.DeviceID=\"a \\\"quoted\\\\ one\""));
+    const CimPath noPath(std::string("no path at all"));
+    const CimPath installed(std::string("Quenx_SoftwareIdentity.InstanceID=\"Quenx:eth0:IMG_PXE\""));
+    const std::string notFound = "Firmware Update cannot find instance '";
+    const std::string noSource = "Firmware Update does not support source '";
+    const std::string noTarget = "Firmware Update does not support target '" + service().toString() + "'";
+    std::vector<Row> rows = {
+        {fromUri(m_uri, nowhere), 5, {notFound + nowhere.toString() + "'"}},
+        {fromUri(m_uri, noPath), 5, {notFound + noPath.toString() + "'"}},
+        {fromUri(m_uri, m_controller), kJobStarted},
+        // For targets all speak alike.
+        {fromUri(m_uri, service()), 4106, {noTarget}},
+        {check(m_image, service()), 4106, {noTarget}},
+        {fromIdentity(m_image, service()), 4106, {noTarget}},
+        {check(m_image, m_port),
+         0,
+         {"TargetTypes are: IMG_PXE+IMG_UEFI", "URI is: " + m_uri, "Verification of image returns: 0",
+          "Target:0, Source:0, Collection:1"}},
+        {fromIdentity(m_image, m_port), kJobStarted, {"Creation of new job returns: 0"}},
+    };
+    struct Resolved {
+        CimPath source;
+        CimPath target;
+        std::string line;
+    };
+    for (const auto& [source, target, line] : std::vector<Resolved>{
+             {missing, m_port, notFound + missing.toString() + "'"},
+             {m_port, m_port, noSource + m_port.toString() + "'"},
+             {installed, m_port, noSource + installed.toString() + "'. It is not a proper Firmware Image."},
+             {m_image, nowhere, notFound + nowhere.toString() + "'"},
+         }) {
+        rows.push_back({check(source, target), 5, {"Checking " + line}});
+        rows.push_back({fromIdentity(source, target), 5, {line}});
+    }
+    const CimPath other = port("eth1");
+    const std::string busy = "Other job is in progress '" + other.toString() + "'";
+    const std::string inUse = "Target '" + m_port.toString() + "' is in update state at this moment";
+    for (const Call& made : {fromUri(m_uri, m_port), check(m_image, m_port), fromIdentity(m_image, m_port)})
+        rows.push_back({made, 6, {inUse}, "eth0"});
+    for (const Call& made : {fromUri(m_uri, other), check(m_image, other), fromIdentity(m_image, other)}) {
+        const std::string error = "EJobIsRunning:Other job for eth0 is running at this moment";
+        rows.push_back({made, 2, {busy, error}, "eth0"});
+    }
+    return rows;
+}
+
+TEST_F(MethodsTest, AnswerEachCallWithItsValueLineJobAndClaim) {
+    for (const std::vector<Row>& rows : {argumentRows(), uriRows(), resolutionRows()}) {
+        for (const Row& row : rows)
+            expect(row);
+    }
+    // The controller stood for the first of its ports.
+    EXPECT_EQ(test::componentsOf("eth0"), "IMG_PXE 2, IMG_UEFI 1");
+    EXPECT_EQ(test::componentsOf("eth1"), "IMG_PXE 1, IMG_UEFI 0");
+}
+
+TEST_F(MethodsTest, FlashARealImageFromEndToEnd) {
+    const CallResult result =
+        install("file://" + test::realRomPath("efi-virtio"), "eth0", {5, 32768}, {"", "IMG_UEFI + IMG_PXE"});
+    ASSERT_TRUE(result.job) << result.returnValue << result.error;
+    EXPECT_EQ(result.job->toString(),
+              "root/cimv2:Quenx_ConcreteJob.InstanceID=\"Quenx:FirmwareUpdate@Job#1\"");
+    const core::InstanceValue job = waitForEnd(*result.job);
+    EXPECT_EQ(state(job), JobStateCompleted);
+    EXPECT_EQ(number(job, "PercentComplete"), 100U);
+    EXPECT_EQ(text(job, "Caption"), "Firmware Update Job 1");
+    EXPECT_EQ(text(job, "Name"), "Firmware Update Job 1");
+    EXPECT_EQ(text(job, "TimeBeforeRemoval"), "00000000000500.000000:000");
+    EXPECT_EQ(text(job, "StartTime").substr(21), "+000");
+    EXPECT_TRUE(job.find("Owner")->value.isNull());
+    EXPECT_EQ(m_adapters->flashContent("eth0"), test::realRom("efi-virtio"));
+    EXPECT_EQ(m_adapters->getFlashImageUpdateProgress("eth0"), 100);
+}
+
+TEST_F(MethodsTest, RefuseAFileThatMayNotBeRead) {
+    std::filesystem::permissions(m_uri.substr(7), std::filesystem::perms::none);
+    EXPECT_EQ(test::runAsNobody([&] {
+                  Codes options = {5};
+                  Texts values;
+                  std::unique_ptr<std::uint8_t[]> image;
+                  std::uint32_t size = 0;
+                  std::vector<FirmwareType> types;
+                  std::string uri = m_uri;
+                  try {
+                      Quenx_ConcreteJob::checkAndVerifyImage("eth0", uri, options, values, image, size,
+                                                             types);
+                  } catch (const utils::Exception& exception) {
+                      return exception.what() + claim();
+                  }
+                  return std::string("accepted");
+              }),
+              "SMASHv2:EUriDoesNotExist:URI: " + m_uri + " is invalid");
+}
+
+TEST_F(MethodsTest, WhatIsAdvertisedWorksAndWhatIsNotIsRefused) {
+    const auto capabilities =
+        m_requests.enumerateInstances("Quenx_SoftwareInstallationServiceCapabilities").at(0);
+    // Actions: from a URI (5) and from an identity (3). The scheme: file (3).
+    EXPECT_EQ(text(capabilities, "SupportedAsynchronousActions"), "5, 3");
+    EXPECT_EQ(text(capabilities, "SupportedURISchemes"), "3");
+    EXPECT_EQ(outcome(fromUri(m_uri, m_port)), kJobStarted);
+    EXPECT_EQ(outcome(fromIdentity(m_image, m_port)), kJobStarted);
+    for (const char* scheme : {"data", "ftp", "http", "https", "nfs", "tftp"})
+        EXPECT_EQ(outcome(fromUri(scheme + m_uri.substr(4), m_port)), 5U) << scheme;
+
+    // Options, each together with 5.
+    const std::string options = ", " + text(capabilities, "SupportedInstallOptions") + ",";
+    for (unsigned option = 0; option <= 20; ++option) {
+        const auto code = static_cast<unsigned short>(option == 20 ? 32768 : option);
+        const bool isAdvertised = options.find(" " + std::to_string(code) + ",") != std::string::npos;
+        // Unknown codes pass unadvertised.
+        const bool passes = isAdvertised || code == 0 || code == 1 || code >= 13;
+        EXPECT_EQ(outcome(fromUri(m_uri, m_port, {5, code}, {"", "IMG_PXE"})), passes ? kJobStarted : 5U)
+            << code;
+        // The identity method supplies 32768 itself and refuses it from the client.
+        EXPECT_EQ(outcome(fromIdentity(m_image, m_port, {}, {5, code})),
+                  passes && code != 32768 ? kJobStarted : 5U)
+            << code;
+    }
+    EXPECT_EQ(outcome(fromUri(m_uri, m_port, {3})), 5U);  // forcing alone is no update
+
+    // Target types: each is known, though not each is in the image.
+    for (const auto& type : *capabilities.find("SupportedTargetTypes")->value.elements()) {
+        const std::string name = core::scalarText(core::CimType::String, type);
+        const unsigned expected = name == "IMG_PXE" || name == "IMG_UEFI" ? kJobStarted : 4106;
+        EXPECT_EQ(outcome(fromUri(m_uri, m_port, {32768, 5}, {name})), expected) << name;
+    }
+    EXPECT_EQ(outcome(fromUri(m_uri, m_port, {32768, 5}, {"IMG_OTHER"})), 5U);
+}
+
+TEST_F(MethodsTest, CheckAndInstallGiveTheSameVerdict) {
+    // The write is refused, so that the adapter stays as it is for the next image.
+    m_backend->writeAnswer = {false, 1, "kept as it is"};
+    std::set<unsigned> verdicts;
+    for (const std::string& uri : {
+             m_uri,
+             file("old.rom", madeRom({{FirmwareType::PXE, 0}, {FirmwareType::UEFI, 0}})),
+             file("pxe.rom", madeRom({{FirmwareType::PXE, 5}})),
+             file("iscsi.rom", madeRom({{FirmwareType::iSCSI, 5}})),
+             file("nic.rom", madeRom({{FirmwareType::PXE, 5}, {FirmwareType::UEFI, 5}}, 0x10ec, 0x8139)),
+             file("real.rom", test::realRom("efi-vmxnet3")),
+         }) {
+        const CimPath source = identityOf(uri);
+        for (const CimPath& target : m_requests.enumerateInstanceNames("Quenx_EthernetPort")) {
+            const unsigned verdict = outcome(check(source, target));
+            EXPECT_EQ(outcome(fromIdentity(source, target)), verdict == 0 ? kJobStarted : verdict)
+                << uri << " on " << target.toString();
+            verdicts.insert(verdict);
+        }
+    }
+    EXPECT_GE(verdicts.size(), 3U);
+}
+
+}  // namespace
