@@ -1,7 +1,7 @@
-// Many clients at once, while adapters are being written to.
+// Many clients at once, while adapters are being written to and files come and go.
 #include <algorithm>
+#include <filesystem>
 #include <functional>
-#include <mutex>
 #include <random>
 #include <thread>
 
@@ -19,40 +19,24 @@ using core::CimPath;
 using test::CallResult;
 using utils::FirmwareType;
 using Clock = std::chrono::steady_clock;
+using Random = std::minstd_rand;
 
-/// Knows how many adapters are being written to at once, and takes its time for it.
-class WatchingBackend : public test::HookedBackend {
-  public:
-    using HookedBackend::HookedBackend;
-
-    bool writeFlashImage(const std::string& adapter, const uint8_t* image, uint32_t imageSize,
-                         uint32_t& errorCode, std::string& errorText) override {
-        const int writing = ++m_writing;
-        for (int most = mostWriting; writing > most && !mostWriting.compare_exchange_weak(most, writing);) {
-        }
-        utils::Thread::msleep(static_cast<unsigned>(writes++ % 4));
-        const bool done = HookedBackend::writeFlashImage(adapter, image, imageSize, errorCode, errorText);
-        --m_writing;
-        return done;
-    }
-
-    std::atomic<int> mostWriting{0};
-    std::atomic<int> writes{0};
-
-  private:
-    std::atomic<int> m_writing{0};
-};
+template <class Items>
+auto& pick(const Items& items, Random& random) {
+    return items[random() % items.size()];
+}
 
 class StressTest : public test::UpdateTest {
   protected:
     StressTest();
-    ~StressTest() override { ma::setBackend(m_backend); }
 
     /// Lets the clients act for this time, and on until it is enough.
     void run(std::chrono::milliseconds time, const std::function<bool()>& isEnough);
     void cleanUp();
 
-    const std::shared_ptr<WatchingBackend> m_watching = std::make_shared<WatchingBackend>(m_backend);
+    std::atomic<int> m_writing{0};
+    std::atomic<int> m_mostWriting{0};
+    std::atomic<std::uint64_t> m_writes{0};
     std::atomic<std::uint64_t> m_requestCount{0};
     std::atomic<std::uint64_t> m_started{0};
     std::atomic<std::uint64_t> m_refused{0};
@@ -60,17 +44,10 @@ class StressTest : public test::UpdateTest {
     std::atomic<std::uint64_t> m_deleted{0};
 
   private:
-    using Random = std::minstd_rand;
-
     void client(unsigned seed);
     void act(Random& random);
-    template <class Items>
-    static auto& pick(const Items& items, Random& random) {
-        return items[random() % items.size()];
-    }
     /// Some path of the model; none where the class has no instances.
     std::optional<CimPath> pickPath(Random& random) const;
-    void walk(Random& random) const;
     void startInstall(Random& random);
     void check(Random& random);
     void deleteSome(Random& random);
@@ -95,21 +72,22 @@ StressTest::StressTest() {
                  {"eth4", file("vmx.rom", vmx)}};
     for (const core::ClassDeclaration& declaration : m_requests.enumerateClasses("", true))
         m_classes.push_back(declaration.name);
-    ma::setBackend(m_watching);
+    // Knows how many adapters are being written to at once, and takes its time for it.
+    m_backend->hook = [this](const std::string& operation, const std::string&) {
+        if (operation == "updateCapabilityWord") --m_writing;
+        if (operation != "writeFlashImage") return;
+        const int writing = ++m_writing;
+        for (int most = m_mostWriting;
+             writing > most && !m_mostWriting.compare_exchange_weak(most, writing);) {
+        }
+        utils::Thread::msleep(static_cast<unsigned>(m_writes++ % 4));
+    };
 }
 
 std::optional<CimPath> StressTest::pickPath(Random& random) const {
     const auto paths = m_requests.enumerateInstanceNames(pick(m_classes, random));
     if (paths.empty()) return std::nullopt;
     return pick(paths, random);
-}
-
-void StressTest::walk(Random& random) const {
-    const std::optional<CimPath> path = pickPath(random);
-    if (!path) return;
-    m_requests.associators(*path, {});
-    m_requests.referenceNames(*path, {});
-    m_requests.references(*path, {pick(m_classes, random), "", "", ""});
 }
 
 void StressTest::startInstall(Random& random) {
@@ -129,7 +107,6 @@ void StressTest::startInstall(Random& random) {
 
 void StressTest::check(Random& random) {
     const auto sources = m_requests.enumerateInstanceNames("Quenx_SoftwareIdentity");
-    if (sources.empty()) return;
     const CallResult result =
         call("CheckSoftwareIdentity", {test::pathArgument("Source", pick(sources, random)),
                                        test::pathArgument("Target", port(pick(m_targets, random).adapter))});
@@ -149,29 +126,29 @@ void StressTest::deleteSome(Random& random) {
 
 void StressTest::act(Random& random) {
     ++m_requestCount;
-    switch (random() % 8) {
-        case 0:
-            m_requests.enumerateInstances(pick(m_classes, random));
-            break;
-        case 1:
-            walk(random);
-            break;
-        case 2:
-            if (const auto path = pickPath(random)) m_requests.getInstance(*path);
-            break;
-        case 3:
-            check(random);
-            break;
-        case 4:
-            deleteSome(random);
-            break;
-        case 5:
-            EXPECT_FALSE(utils::isDebugLogged());
-            EXPECT_EQ(utils::logLevel, 0);
-            break;
-        default:
-            startInstall(random);
+    const auto action = random() % 8;
+    if (action == 0) m_requests.enumerateInstances(pick(m_classes, random));
+    if (action == 1 || action == 2) {
+        const auto path = pickPath(random);
+        if (!path) return;
+        m_requests.getInstance(*path);
+        m_requests.associators(*path, {});
+        m_requests.referenceNames(*path, {});
+        m_requests.references(*path, {pick(m_classes, random), "", "", ""});
     }
+    if (action == 3) check(random);
+    if (action == 4) deleteSome(random);
+    if (action == 5) {
+        EXPECT_EQ(utils::logLevel, 0);
+        // A file comes, goes, or is replaced.
+        const std::string path = m_folder / "goes.rom";
+        const auto rom = test::madeRom({{FirmwareType::PXE, static_cast<uint32_t>(random() % 9)}});
+        m_folder.write("new", std::span(rom));
+        std::error_code ignored;  // another client was faster
+        std::filesystem::rename(m_folder / "new", path, ignored);
+        if (random() % 2 == 0) std::filesystem::remove(path, ignored);
+    }
+    if (action > 5) startInstall(random);
 }
 
 void StressTest::client(unsigned seed) {
@@ -203,6 +180,8 @@ void StressTest::run(std::chrono::milliseconds time, const std::function<bool()>
 
 void StressTest::cleanUp() {
     deleteJobs();
+    for (const char* name : {"new", "goes.rom"})
+        std::filesystem::remove(m_folder / name);
     // What the rebuilt association classes hold, is what is there without jobs.
     for (const std::string& name : m_classes)
         m_requests.enumerateInstances(name);
@@ -233,7 +212,7 @@ TEST_F(StressTest, LosesNothing) {
 
     // But for the room that lists keep for more elements: a job takes about 10 KB.
     EXPECT_LT(test::liveBytes() - before, 1000);
-    EXPECT_EQ(m_watching->mostWriting, 1);
+    EXPECT_EQ(m_mostWriting, 1);
     EXPECT_EQ(claim(), "");
     EXPECT_GE(m_started, test::effort().jobs);
     EXPECT_GT(m_refused, 0U);
@@ -241,7 +220,7 @@ TEST_F(StressTest, LosesNothing) {
     EXPECT_GT(m_deleted, 0U);
     // Every job that was started has run, and each flash has ended well.
     EXPECT_EQ(static_cast<std::uint64_t>(JobThread::executionCount - executionsBefore), m_started);
-    EXPECT_EQ(static_cast<std::uint64_t>(m_watching->writes), m_started);
+    EXPECT_EQ(m_writes, m_started);
     EXPECT_EQ(test::componentsOf("eth4"), "IMG_iSCSI 1, IMG_UEFI 0");
     test::count("requests made under stress", m_requestCount);
     test::count("jobs created and deleted under stress", m_started);
@@ -261,7 +240,7 @@ TEST_F(StressTest, WithoutReleaseACheckShutsUpdatesOut) {
     EXPECT_EQ(claim(), holder);
     EXPECT_EQ(install(goodImage(), holder).returnValue, 6U);
     EXPECT_EQ(install(goodImage(), holder == "eth0" ? "eth1" : "eth0").returnValue, 2U);
-    EXPECT_EQ(m_watching->mostWriting, startedBefore == 0 ? 0 : 1);
+    EXPECT_EQ(m_mostWriting, startedBefore == 0 ? 0 : 1);
     test::count("requests made under stress", m_requestCount);
 }
 

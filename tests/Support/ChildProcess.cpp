@@ -30,15 +30,6 @@ constexpr uid_t nobody = 65534;
     _exit(isWritten ? 0 : 1);
 }
 
-std::string readAll(int input) {
-    std::string text;
-    std::array<char, 512> buffer{};
-    for (ssize_t count = 0; (count = read(input, buffer.data(), buffer.size())) > 0;) {
-        text.append(buffer.data(), static_cast<std::size_t>(count));
-    }
-    return text;
-}
-
 }  // namespace
 
 std::string runAsNobody(const std::function<std::string()>& body) {
@@ -47,7 +38,9 @@ std::string runAsNobody(const std::function<std::string()>& body) {
     const pid_t child = fork();
     if (child == 0) runChild(ends[1], body);
     close(ends[1]);
-    std::string outcome = child < 0 ? "no child" : readAll(ends[0]);
+    std::string outcome = child < 0 ? "no child" : "";
+    for (char next = 0; read(ends[0], &next, 1) == 1;)
+        outcome += next;
     close(ends[0]);
     int status = 0;
     if (child > 0 && (waitpid(child, &status, 0) != child || status != 0)) {

@@ -99,7 +99,7 @@ LogLevelGuard::~LogLevelGuard() {
 
 }  // namespace test
 
-// The C library's functions, and the forms that a fortified build calls instead of them.
+// The C library's functions that the log uses, and the form that a fortified build calls instead.
 extern "C" {
 
 QUENX_EXPORT void openlog(const char* identity, int, int) {
@@ -109,21 +109,11 @@ QUENX_EXPORT void openlog(const char* identity, int, int) {
 
 QUENX_EXPORT void closelog() {}
 
-QUENX_EXPORT void vsyslog(int priority, const char* format, va_list arguments) {
-    test::record(priority, format, arguments);
-}
-
 QUENX_EXPORT void syslog(int priority, const char* format, ...) {
     va_list arguments;
     va_start(arguments, format);
     test::record(priority, format, arguments);
     va_end(arguments);
-}
-
-QUENX_EXPORT void __vsyslog_chk(int priority, int, const char* format, va_list arguments)
-    __attribute__((format(printf, 3, 0)));
-QUENX_EXPORT void __vsyslog_chk(int priority, int, const char* format, va_list arguments) {
-    test::record(priority, format, arguments);
 }
 
 QUENX_EXPORT void __syslog_chk(int priority, int, const char* format, ...)

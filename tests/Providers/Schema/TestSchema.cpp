@@ -56,8 +56,8 @@ std::map<std::string, const core::CimClassInfo*> allClasses() {
 }
 
 const SchemaRow& rowOf(const std::string& name) {
-    const auto& table = schemaTable();
-    return *std::find_if(table.begin(), table.end(), [&](const SchemaRow& row) { return name == row.name; });
+    return *std::find_if(std::begin(kSchemaTable), std::end(kSchemaTable),
+                         [&](const SchemaRow& row) { return name == row.name; });
 }
 
 std::string nameIn(const std::string& word) {
@@ -111,8 +111,8 @@ std::vector<std::string> declaredBy(const core::CimClassInfo& info) {
 
 TEST(Schema, HasTheClassesOfTheTableWithTheirMembersInOrder) {
     const auto classes = allClasses();
-    EXPECT_EQ(classes.size(), schemaTable().size());
-    for (const SchemaRow& row : schemaTable()) {
+    EXPECT_EQ(classes.size(), std::size(kSchemaTable));
+    for (const SchemaRow& row : kSchemaTable) {
         SCOPED_TRACE(row.name);
         ASSERT_TRUE(classes.contains(row.name));
         const core::CimClassInfo& info = *classes.at(row.name);

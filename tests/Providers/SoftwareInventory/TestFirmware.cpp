@@ -2,7 +2,6 @@
 #include <sys/stat.h>
 
 #include <filesystem>
-#include <thread>
 
 #include "Providers/SoftwareUpdate/UpdateTest.h"
 #include "Support/TestRoms.h"
@@ -144,25 +143,6 @@ TEST_F(Firmware, ThatIsInstalledBelongsToItsPort) {
     const auto prepared = test::prepareImage("eth0", rom(9));
     ASSERT_TRUE(test::writeImage("eth0", prepared.image).done);
     EXPECT_EQ(text(m_requests.getInstance(installed), "MajorVersion"), "9");
-}
-
-TEST_F(Firmware, IsServedToManyWhileFilesComeAndGo) {
-    m_folder.write("a/stays.rom", rom(1));
-    std::vector<std::jthread> clients;
-    for (const char* name : {"Quenx_SoftwareIdentity", "Quenx_SoftwareIdentityResource", "CIM_Dependency",
-                             "CIM_ManagedElement"}) {
-        clients.emplace_back([this, name] {
-            for (int round = 0; round < 40; round++)
-                m_requests.enumerateInstances(name);
-        });
-    }
-    for (int round = 0; round < 40; round++) {
-        m_folder.write("b/goes.rom", rom(2));
-        EXPECT_GE(images().size(), 1U);
-        fs::remove(m_folder / "b/goes.rom");
-    }
-    clients.clear();
-    EXPECT_EQ(files(), Rows{"stays.rom"});
 }
 
 }  // namespace

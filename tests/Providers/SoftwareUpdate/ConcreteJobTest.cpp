@@ -43,6 +43,11 @@ TEST_F(ConcreteJobTest, StartsNewAndIsStartedOnce) {
     EXPECT_EQ(job->PercentComplete.get(), 0);
     EXPECT_EQ(core::datetimeText(job->TimeOfLastStateChange.get()), "00000000000000.000000:000");
     EXPECT_TRUE(job->ElapsedTime.get().isPeriod());
+    EXPECT_EQ(core::datetimeText(job->TimeBeforeRemoval.get()), "00000000000500.000000:000");
+    EXPECT_EQ(core::datetimeText(job->StartTime.get()).substr(21), "+000");
+    EXPECT_EQ(job->Caption.get(), "Firmware Update Job 7");
+    EXPECT_EQ(job->Name.get(), "Firmware Update Job 7");
+    EXPECT_TRUE(job->Owner.IsNull());
     EXPECT_TRUE(job->JobInParameters.IsNull());
     EXPECT_TRUE(job->JobOutParameters.IsNull());
     EXPECT_TRUE(job->MethodName.IsNull());
