@@ -29,7 +29,7 @@ int main(int argc, char** argv) {
         std::fprintf(stderr, "usage: %s [--seconds=N] [--jobs=N]\n", argv[0]);
         return 2;
     }
-    test::effort() = {true, std::chrono::seconds(seconds), jobs};
+    test::effort = {true, std::chrono::seconds(seconds), jobs};
     const int status = RUN_ALL_TESTS();
     std::printf("\n| figure | number |\n|---|---|\n");
     test::printFigures();

@@ -87,8 +87,8 @@ TEST_F(AllocationTest, FailingInTheRequestAndInTheWorker) {
 TEST_F(AllocationTest, FailingWhileEverythingIsLogged) {
     // Destructors that log, and refusals on their way, must survive it.
     test::SyslogCapture::keep(false);
-    failEverywhere(On::ThisThread, test::effort().everything ? 1 : 23, false);
-    failEverywhere(On::OtherThreads, test::effort().everything ? 1 : 5, false);
+    failEverywhere(On::ThisThread, test::effort.everything ? 1 : 23, false);
+    failEverywhere(On::OtherThreads, test::effort.everything ? 1 : 5, false);
     test::SyslogCapture::keep(true);
 }
 

@@ -1,7 +1,11 @@
 #pragma once
 
 #include <chrono>
+#include <cinttypes>
 #include <cstdint>
+#include <cstdio>
+#include <map>
+#include <mutex>
 #include <string>
 
 namespace test {
@@ -14,11 +18,21 @@ struct Effort {
 };
 
 /// The program's effort; the soak sets it before the tests run.
-Effort& effort();
+inline Effort effort;
+
+inline std::mutex figuresMutex;
+inline std::map<std::string, std::uint64_t> figures;
 
 /// Adds to one of the figures that the soak prints at its end, such as "faults injected".
-void count(const std::string& figure, std::uint64_t number = 1);
+inline void count(const std::string& figure, std::uint64_t number = 1) {
+    const std::lock_guard lock(figuresMutex);
+    figures[figure] += number;
+}
+
 /// One line a figure, in the order of their names.
-void printFigures();
+inline void printFigures() {
+    for (const auto& [name, number] : figures)
+        std::printf("| %s | %" PRIu64 " |\n", name.c_str(), number);
+}
 
 }  // namespace test

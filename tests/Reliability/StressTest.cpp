@@ -194,9 +194,9 @@ TEST_F(StressTest, LosesNothing) {
     cleanUp();
     const std::int64_t before = test::liveBytes();
 
-    const std::uint64_t wanted = m_started + test::effort().jobs;
+    const std::uint64_t wanted = m_started + test::effort.jobs;
     // On a busy machine the rarer outcomes need longer to come.
-    run(test::effort().stress,
+    run(test::effort.stress,
         [&] { return m_started >= wanted && m_refused > 0 && m_checked > 0 && m_deleted > 0; });
     std::vector<std::weak_ptr<core::CimInstance>> jobs;
     {
@@ -214,7 +214,7 @@ TEST_F(StressTest, LosesNothing) {
     EXPECT_LT(test::liveBytes() - before, 1000);
     EXPECT_EQ(m_mostWriting, 1);
     EXPECT_EQ(claim(), "");
-    EXPECT_GE(m_started, test::effort().jobs);
+    EXPECT_GE(m_started, test::effort.jobs);
     EXPECT_GT(m_refused, 0U);
     EXPECT_GT(m_checked, 0U);
     EXPECT_GT(m_deleted, 0U);
@@ -228,7 +228,7 @@ TEST_F(StressTest, LosesNothing) {
 }
 
 TEST_F(StressTest, WithoutReleaseACheckShutsUpdatesOut) {
-    const std::chrono::milliseconds time = test::effort().stress / 4;
+    const std::chrono::milliseconds time = test::effort.stress / 4;
     run(time, [&] { return m_checked > 0; });
     cleanUp();
     // Nothing that ran then gave the claim back.

@@ -53,7 +53,7 @@ bool UpdatePowerLossTest::cutAt(int k, const test::Medium& medium) {
 TEST_F(UpdatePowerLossTest, LeavesAWholeImageAndAnAdapterThatCanBeUpdated) {
     const test::LogLevelGuard silent(0);
     // The simulator's own tests have all kinds of medium.
-    for (const test::Medium& medium : std::span(test::MEDIA).first(test::effort().everything ? 4 : 2)) {
+    for (const test::Medium& medium : std::span(test::MEDIA).first(test::effort.everything ? 4 : 2)) {
         int k = 1;
         for (; cutAt(k, medium); ++k)
             ASSERT_FALSE(HasFailure()) << "cut at call " << k;
