@@ -22,82 +22,58 @@ struct SafeListTest : ::testing::Test {
     std::vector<int> deleted;
     Element one{deleted, 1};
     Element two{deleted, 2};
-    Element three{deleted, 3};
     List list{false};
 };
 
-template <typename Operation>
-std::string failureOf(Operation operation) {
-    const test::LogLevelGuard guard(0);
-    try {
-        operation();
-    } catch (const utils::Exception& failure) {
-        return failure.what();
-    }
-    return {};
-}
-
-std::string assertionAt(int line) {
-    return "SMASHv2:src/Utils/Containers.h:" + std::to_string(line) +
-           ": Assertion failed: 'implementation != __null'";
-}
-
 }  // namespace
 
-TEST_F(SafeListTest, WalksInOrderAndStaysAtTheEnd) {
+TEST_F(SafeListTest, AnIteratorMeetsWhatIsAddedAndOutlivesAClear) {
     List::Iterator iterator = list.getElements();
     EXPECT_EQ(iterator.first(), nullptr);
     list.add(&one);
-    list.add(&two);
-    EXPECT_EQ(iterator.size(), 2U);
-    EXPECT_EQ(iterator.first(), &one);
-    list.add(&three);
-    EXPECT_EQ(iterator.next(), &two);
-    EXPECT_EQ(iterator.next(), &three);
-    list.add(&two);
-    EXPECT_EQ(iterator.next(), nullptr);
-    EXPECT_EQ(iterator.next(), nullptr);
-    EXPECT_EQ(iterator.first(), &one);
-}
-
-TEST_F(SafeListTest, AnIteratorOutlivesAClear) {
     list.add(&one);
+    EXPECT_EQ(iterator.first(), &one);
     list.add(&two);
-    List::Iterator iterator = list.getElements();
-    iterator.first();
+    EXPECT_EQ(iterator.next(), &one);
+    EXPECT_EQ(iterator.next(), &two);
+    list.add(&two);  // too late
+    EXPECT_EQ(iterator.next(), nullptr);
+    EXPECT_EQ(iterator.first(), &one);
     list.clear();
     EXPECT_EQ(iterator.next(), nullptr);
-    list.add(&three);
+    list.add(&two);
     EXPECT_EQ(iterator.next(), nullptr);
-    EXPECT_EQ(iterator.first(), &three);
+    EXPECT_EQ(iterator.first(), &two);
 }
 
 TEST_F(SafeListTest, CopyingAnIteratorTransfersIt) {
+    const test::LogLevelGuard guard(1);
     list.add(&one);
     list.add(&two);
     List::Iterator source = list.getElements();
     source.first();
     List::Iterator copy = source;
     EXPECT_EQ(copy.next(), &two);
-    EXPECT_EQ(failureOf([&] { source.next(); }), assertionAt(147));
-    EXPECT_EQ(failureOf([&] { source.first(); }), assertionAt(156));
-    EXPECT_EQ(failureOf([&] { source.size(); }), assertionAt(164));
+    EXPECT_THROW(source.next(), utils::Exception);
+    EXPECT_THROW(source.first(), utils::Exception);
+    EXPECT_THROW(source.size(), utils::Exception);
+    std::vector<std::string> assertions;
+    for (const char* line : {"147", "156", "164"})  // log readers know these
+        assertions.push_back("src/Utils/Containers.h:" + std::string(line) +
+                             ": Assertion failed: 'implementation != __null'");
+    EXPECT_EQ(test::SyslogCapture::messages("error"), assertions);
     source = copy;
-    EXPECT_EQ(source.first(), &one);
-    EXPECT_EQ(failureOf([&] { copy.first(); }), assertionAt(156));
     List::Iterator& alias = source;
     source = alias;
     EXPECT_EQ(source.size(), 2U);
+    EXPECT_THROW(copy.first(), utils::Exception);
 }
 
 TEST_F(SafeListTest, ClonesStartOverAndANullListIsEmpty) {
     list.add(&one);
-    list.add(&two);
     List::SimpleIteratorImplementation advanced(&list);
     advanced.next();
-    const auto clone = advanced.clone();
-    EXPECT_EQ(clone->next(), &one);
-    EXPECT_EQ(advanced.next(), &two);
+    EXPECT_EQ(advanced.clone()->next(), &one);
 
     List::Iterator none(std::make_unique<List::SimpleIteratorImplementation>(nullptr));
     EXPECT_EQ(none.first(), nullptr);
@@ -113,15 +89,9 @@ TEST_F(SafeListTest, AnOwningListDeletesFrontToBackAndSkipsNull) {
         owning.add(nullptr);
         owning.clear();
         EXPECT_EQ(deleted, (std::vector<int>{1, 2}));
-        EXPECT_EQ(owning.size(), 0U);
         owning.add(new Element(deleted, 3));
     }
     EXPECT_EQ(deleted, (std::vector<int>{1, 2, 3}));
-    {
-        List borrowing(false);
-        borrowing.add(&one);
-    }
-    EXPECT_EQ(deleted.size(), 3U);
 }
 
 TEST_F(SafeListTest, ManyThreadsAddWalkAndClear) {
@@ -140,6 +110,4 @@ TEST_F(SafeListTest, ManyThreadsAddWalkAndClear) {
     }
     for (std::thread& thread : threads)
         thread.join();
-    list.clear();
-    EXPECT_EQ(list.size(), 0U);
 }

@@ -10,52 +10,28 @@ using test::LogLevelGuard;
 using test::SyslogCapture;
 using utils::Exception;
 
-namespace {
-
-class EDerived : public Exception {
-  public:
-    explicit EDerived(std::string text) : Exception("EDerived:" + text) {}
-};
-
-std::vector<std::string> loggedErrors() {
-    return SyslogCapture::messages("error");
-}
-
-}  // namespace
-
 TEST(Exception, OnlyTheOneFromATextIsPrefixedAndBothLogTheBareText) {
     const LogLevelGuard guard(1);
     EXPECT_STREQ(Exception("wrong value %d", 7).what(), "wrong value 7");
     EXPECT_STREQ(Exception(std::string("a%n%s")).what(), "SMASHv2:a%n%s");
-    EXPECT_STREQ(EDerived("%s text").what(), "SMASHv2:EDerived:%s text");
-    EXPECT_EQ(loggedErrors(), (std::vector<std::string>{"wrong value 7", "a%n%s", "EDerived:%s text"}));
-    EXPECT_EQ(SyslogCapture::count("(Exception@Exception.cpp:"), 3U);
-    EXPECT_EQ(SyslogCapture::count("  Backtrace: "), 3U);
-}
-
-TEST(Exception, AFormatIsCutAt511AndATextIsNot) {
-    const LogLevelGuard guard(0);
+    EXPECT_EQ(SyslogCapture::messages("error"), (std::vector<std::string>{"wrong value 7", "a%n%s"}));
+    EXPECT_EQ(SyslogCapture::count("(Exception@Exception.cpp:"), 2U);
+    EXPECT_EQ(SyslogCapture::count("  Backtrace: "), 2U);
+    // A format is cut, a text is not.
     const std::string text(600, 'x');
-    EXPECT_EQ(std::string(Exception("%s", text.c_str()).what()), text.substr(0, 511));
-    EXPECT_EQ(std::string(Exception(text).what()), "SMASHv2:" + text);
-    EXPECT_TRUE(SyslogCapture::lines().empty());
+    EXPECT_EQ(Exception("%s", text.c_str()).what(), text.substr(0, 511));
+    EXPECT_EQ(Exception(text).what(), "SMASHv2:" + text);
 }
 
 TEST(Exception, AssertionsNameFileLineAndCondition) {
     const int two = 2;
     try {
+        QUENX_ASSERT(two == 2);
         QUENX_ASSERT(two == 3);
         FAIL();
     } catch (const Exception& failure) {
         EXPECT_EQ(failure.what(), "SMASHv2:tests/Utils/ExceptionTest.cpp:" + std::to_string(__LINE__ - 3) +
                                       ": Assertion failed: 'two == 3'");
-    }
-    EXPECT_NO_THROW(QUENX_ASSERT(two == 2));
-    try {
-        QUENX_ASSERT_TEXT(two == 3, "a.cpp", 9, "__null != %d");
-        FAIL();
-    } catch (const Exception& failure) {
-        EXPECT_STREQ(failure.what(), "SMASHv2:a.cpp:9: Assertion failed: '__null != %d'");
     }
 }
 
@@ -70,10 +46,8 @@ TEST(TimeStamp, LogsItsEndAndItsStartIfAsked) {
     }
     const auto messages = SyslogCapture::messages();
     ASSERT_EQ(messages.size(), 5U);
-    EXPECT_EQ(messages[0].rfind("time(Class::operation) = ", 0), 0U);
-    EXPECT_EQ(messages[0].substr(messages[0].size() - 3), "ms ");
+    EXPECT_TRUE(messages[0].starts_with("time(Class::operation) = "));
+    EXPECT_TRUE(messages[0].ends_with("ms "));
     EXPECT_EQ(messages[1], "<loud>");
     EXPECT_EQ(messages[3], name);
-    EXPECT_EQ(SyslogCapture::count("(Init@Debug.cpp:"), 2U);
-    EXPECT_EQ(SyslogCapture::count("(~TimeStamp@Debug.cpp:"), 3U);
 }

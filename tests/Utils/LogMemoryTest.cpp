@@ -1,4 +1,4 @@
-// A program of its own, since it replaces the global allocation functions by ones that fail on demand.
+// A program of its own, since it replaces the global allocation function by one that fails on demand.
 #include <gtest/gtest.h>
 
 #include <cstdlib>
@@ -12,31 +12,18 @@ namespace {
 
 thread_local long allocationsLeft = -1;  // negative: no limit
 
-void* allocate(std::size_t size) {
+}  // namespace
+
+void* operator new(std::size_t size) {
     if (allocationsLeft == 0) throw std::bad_alloc();
     if (allocationsLeft > 0) --allocationsLeft;
     if (void* const memory = std::malloc(size == 0 ? 1 : size)) return memory;
     throw std::bad_alloc();
 }
-
-}  // namespace
-
-void* operator new(std::size_t size) {
-    return allocate(size);
-}
-void* operator new[](std::size_t size) {
-    return allocate(size);
-}
 void operator delete(void* memory) noexcept {
     std::free(memory);
 }
-void operator delete[](void* memory) noexcept {
-    std::free(memory);
-}
 void operator delete(void* memory, std::size_t) noexcept {
-    std::free(memory);
-}
-void operator delete[](void* memory, std::size_t) noexcept {
     std::free(memory);
 }
 

@@ -9,31 +9,11 @@
 
 #include "Support/SyslogCapture.h"
 #include "Utils/Exception.h"
-#include "Utils/Os/Linux/linux.h"
 
 using utils::Time;
 using Fields = std::array<int, 6>;
 
 namespace {
-
-/// Sets the time zone for a scope.
-class ZoneGuard {
-  public:
-    explicit ZoneGuard(const char* zone) {
-        if (const char* const saved = getenv("TZ")) m_saved = saved;
-        setenv("TZ", zone, 1);
-        tzset();
-    }
-    ~ZoneGuard() {
-        m_saved.empty() ? unsetenv("TZ") : setenv("TZ", m_saved.c_str(), 1);
-        tzset();
-    }
-    ZoneGuard(const ZoneGuard&) = delete;
-    ZoneGuard& operator=(const ZoneGuard&) = delete;
-
-  private:
-    std::string m_saved;
-};
 
 Time make(const Fields& f) {
     return Time(f[0], f[1], f[2], f[3], f[4], f[5]);
@@ -66,24 +46,23 @@ TEST(Time, CalendarFieldsAreUtcInEveryZone) {
         {{1970, 6, 15, 0, 0, 0}, 14256000},  // Dublin kept UTC+1 all year
         {{1971, 6, 1, 12, 0, 0}, 44625600},  // Monrovia was 44 minutes and a half off
         {{2000, 2, 29, 23, 59, 59}, 951868799},
-        {{2012, 2, 29, 12, 34, 56}, 1330518896},
         {{2024, 7, 1, 1, 30, 0}, 1719797400},  // summer time in the north
         {{2038, 1, 19, 3, 14, 8}, 2147483648},
     };
-    for (const char* zone : {"UTC0", "EST5EDT,M3.2.0,M11.1.0", "<+1030>-10:30", "<-12>12", "Europe/Dublin",
-                             "America/New_York", "Africa/Monrovia", "Australia/Lord_Howe"}) {
-        const ZoneGuard guard(zone);
+    for (const char* zone : {"EST5EDT,M3.2.0,M11.1.0", "<+1030>-10:30", "Europe/Dublin", "Africa/Monrovia"}) {
+        setenv("TZ", zone, 1);
+        tzset();
         SCOPED_TRACE(zone);
         for (const auto& row : rows) {
             EXPECT_EQ(make(row.fields).getSeconds(), row.seconds);
-            EXPECT_FALSE(make(row.fields).isPeriod());
             EXPECT_EQ(decode(make(row.fields)), row.fields);
         }
         // Before 1970 the count wraps, by the same amount everywhere.
-        EXPECT_EQ(make({1916, 5, 21, 3, 0, 0}), Time(-1691960400ULL * 1000000));
         EXPECT_EQ(make({1900, 1, 1, 0, 0, 0}), Time(-2208988800ULL * 1000000));
         EXPECT_EQ(failureOf({1969, 12, 31, 23, 59, 59}), "wrong time value");
     }
+    unsetenv("TZ");
+    tzset();
 }
 
 TEST(Time, FieldsAreCheckedInOrder) {
@@ -91,19 +70,14 @@ TEST(Time, FieldsAreCheckedInOrder) {
         Fields fields;
         const char* failure;
     } rows[] = {
-        {{1899, 12, 31, 23, 59, 59}, "wrong year value 1899"},
         {{1899, 13, 0, 0, 0, 0}, "wrong year value 1899"},
         {{2012, 0, 40, 0, 0, 0}, "wrong month value 0"},
-        {{2012, 13, 1, 0, 0, 0}, "wrong month value 13"},
         {{2012, 1, 0, 99, 0, 0}, "wrong day value 0"},
-        {{2012, 1, 32, 0, 0, 0}, "wrong day value 32"},
         {{2012, 4, 31, 0, 0, 0}, "wrong day value 31"},
         {{2012, 2, 29, 0, 0, 0}, ""},
-        {{2013, 2, 29, 0, 0, 0}, "wrong day value 29"},
         {{1900, 2, 29, 0, 0, 0}, "wrong day value 29"},
         {{2000, 2, 30, 0, 0, 0}, "wrong day value 30"},
         {{2012, 12, 31, -1, 99, 0}, "wrong hour value -1"},
-        {{2012, 12, 31, 24, 0, 0}, "wrong hour value 24"},
         {{2012, 12, 31, 23, 60, 99}, "wrong minute value 60"},
         {{2012, 12, 31, 23, 59, 60}, "wrong second value 60"},
     };
@@ -113,24 +87,18 @@ TEST(Time, FieldsAreCheckedInOrder) {
 
 TEST(Time, IntervalsDecodeToDaysAndTheirParts) {
     Time time(5ULL);
-    EXPECT_TRUE(time.isPeriod());
     EXPECT_EQ(decode(time.setIntervalInSeconds(90061)), (Fields{0, 0, 1, 1, 1, 1}));
-    time.setIntervalInSeconds(4294967295U);
-    EXPECT_EQ(time.getSeconds(), 4294967295U);
     time.setIntervalInMinutes(71582789);  // 44 s above 2^32
     EXPECT_EQ(time.getSeconds(), 44U);
     EXPECT_EQ(time.getMiliseconds(), 44000U);
     time = 1999999ULL;
     EXPECT_EQ(time.getMiliseconds(), 1999U);
-    EXPECT_EQ(time.getSeconds(), 1U);
     EXPECT_EQ(decode(Time(~0ULL)), (Fields{0, 0, 213503982, 8, 1, 49}));
 }
 
 TEST(Time, ArithmeticMakesIntervalsAndComparesValuesOnly) {
     Time stamp(1970, 1, 1, 0, 0, 1);
     EXPECT_TRUE(stamp == Time(1000000ULL));
-    EXPECT_TRUE(stamp <= Time(1000000ULL));
-    EXPECT_FALSE(stamp <= Time(999999ULL));
     const Time difference = stamp - Time(400000ULL);
     EXPECT_TRUE(difference.isPeriod());
     EXPECT_TRUE(difference == Time(600000ULL));
@@ -141,23 +109,19 @@ TEST(Time, ArithmeticMakesIntervalsAndComparesValuesOnly) {
 }
 
 TEST(Time, ElapsedTimeCountsFromATimestampOnly) {
-    const std::uint64_t before = os::getuSecondsSinceEpoch();
-    Time start;
-    EXPECT_GE(start.getSeconds(), before / 1000000);
-    Time elapsed(1970, 1, 1, 0, 0, 0);
+    const Time before;
+    EXPECT_FALSE(before.isPeriod());
+    Time elapsed;
     elapsed.setInterval(Time(1970, 1, 1, 0, 0, 0));
     EXPECT_TRUE(elapsed.isPeriod());
-    EXPECT_GE(elapsed.getSeconds(), before / 1000000);
-    elapsed.resetTimer();
-    EXPECT_FALSE(elapsed.isPeriod());
+    EXPECT_GE(elapsed.getSeconds(), before.getSeconds());
 
     const test::LogLevelGuard guard(1);
     EXPECT_THROW(elapsed.setInterval(Time(5ULL)), utils::Exception);
     EXPECT_TRUE(test::SyslogCapture::contains("Assertion failed: 'dtStart.isTimestamp == true'"));
     int i = 0;
     EXPECT_THROW(Time(5ULL).decodeToDate(i, i, i, i, i, i), utils::Exception);
-    EXPECT_TRUE(test::SyslogCapture::contains("src/Utils/Time.cpp:"));
     EXPECT_TRUE(test::SyslogCapture::contains("Assertion failed: 'this->isTimestamp'"));
-    EXPECT_THROW(elapsed.decodeToPeriod(i, i, i, i), utils::Exception);
+    EXPECT_THROW(before.decodeToPeriod(i, i, i, i), utils::Exception);
     EXPECT_TRUE(test::SyslogCapture::contains("Assertion failed: 'this->isPeriod()'"));
 }

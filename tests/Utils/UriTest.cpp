@@ -7,6 +7,7 @@
 
 using utils::Uri;
 using Scheme = Uri::SupportedURISchemes;
+using Lines = std::vector<std::string>;
 
 TEST(Uri, TextsGiveSchemePathAndLogLine) {
     const test::LogLevelGuard guard(2);
@@ -21,19 +22,12 @@ TEST(Uri, TextsGiveSchemePathAndLogLine) {
         {"file://server/x", Scheme::File, "server/x", nullptr},
         {"file:///a:b::c:", Scheme::File, "/a:b::c:", nullptr},
         {"file:///a%20b%2F", Scheme::File, "/a%20b%2F", nullptr},
-        {"file:///", Scheme::File, "/", nullptr},
         {"file://", Scheme::File, "", nullptr},
         {"https://host:80/x", Scheme::Https, "host:80/x", nullptr},
-        {"data://x", Scheme::Data, "x", nullptr},
-        {"ftp://x", Scheme::Ftp, "x", nullptr},
-        {"http://x", Scheme::Http, "x", nullptr},
-        {"nfs://x", Scheme::Nfs, "x", nullptr},
         {"tftp://x", Scheme::Tftp, "x", nullptr},
         {"file:/x", Scheme::Unknown, "", "Uknown URI format of 'file:/x'"},
-        {"file:/", Scheme::Unknown, "", "Uknown URI format of 'file:/'"},
         {"file:", Scheme::Unknown, "", "Uknown URI format of 'file:'"},
         {"://x", Scheme::Unknown, "", "Uknown URI format of '://x'"},
-        {"::", Scheme::Unknown, "", "Uknown URI format of '::'"},
         {" file:///x", Scheme::Unknown, "", "Uknown URI format of ' file:///x'"},
         {"files:///x", Scheme::Unknown, "", "Uknown URI format of 'files:///x'"},
         {"/opt/%n%s", Scheme::Unknown, "", "Incorrect URI format of '/opt/%n%s'"},
@@ -46,15 +40,9 @@ TEST(Uri, TextsGiveSchemePathAndLogLine) {
         EXPECT_EQ(uri.getScheme(), row.scheme);
         EXPECT_EQ(uri.getSourcePath(), row.path);
         EXPECT_EQ(uri.IsUriSupported(), row.scheme == Scheme::File);
-        std::vector<std::string> expected;
-        if (row.line != nullptr) expected.emplace_back(row.line);
-        EXPECT_EQ(test::SyslogCapture::messages(), expected);
+        EXPECT_EQ(test::SyslogCapture::messages(), row.line == nullptr ? Lines{} : Lines{row.line});
     }
-    EXPECT_EQ(static_cast<int>(Scheme::Https), 6);
-}
-
-TEST(Uri, AMalformedTextKeepsThePath) {
-    const test::LogLevelGuard guard(0);
+    // A malformed text keeps the path.
     Uri uri("file:///x");
     uri.parseUri("nonsense");
     EXPECT_FALSE(uri.IsUriSupported());
@@ -69,5 +57,4 @@ TEST(Uri, OnlyLocalFilesThatHaveASizeAreAccessible) {
     EXPECT_FALSE(Uri("file://" + file + "-").IsUriAccesible());
     EXPECT_FALSE(Uri("file://" + folder.path()).IsUriAccesible());
     EXPECT_FALSE(Uri("https://" + file).IsUriAccesible());
-    EXPECT_FALSE(Uri(file).IsUriAccesible());
 }

@@ -9,46 +9,29 @@
 using os::OSLocker;
 using test::SyslogCapture;
 
-TEST(OSLocker, LocksOnceAndNeverWaits) {
-    os::OSLockerLinux locker;
-    EXPECT_EQ(locker.Lock(), 0);
-    EXPECT_EQ(locker.Lock(), 2);
-    EXPECT_EQ(locker.UnLock(), 0);
-    EXPECT_EQ(locker.UnLock(), 0);
-    EXPECT_EQ(locker.Lock(), 0);
-}
-
 TEST(OSLocker, AScopeTakesTheCurrentLockerAndFreesItEvenIfItWasBusy) {
     const test::LogLevelGuard guard(2);
     os::OSLockerLinux locker;
-    locker.Lock();
-    SyslogCapture::clear();
+    EXPECT_EQ(locker.Lock(), 0);
     {
         const OSLocker::AutoOSLocker scope;
         EXPECT_EQ(locker.Lock(), 2);
     }
     EXPECT_EQ(locker.Lock(), 0);
-    const auto messages = SyslogCapture::messages();
-    ASSERT_EQ(messages.size(), 4U);
-    EXPECT_EQ(messages[0], "autolocking semaphore");
-    EXPECT_EQ(messages[1].rfind("Instance of OSLocker (#", 0), 0U);
-    EXPECT_EQ(messages[2], "autoreleasing semaphore");
+    EXPECT_EQ(locker.UnLock(), 0);
+    EXPECT_EQ(locker.UnLock(), 0);
+    EXPECT_EQ(SyslogCapture::count("\"autolocking semaphore\""), 1U);
+    EXPECT_EQ(SyslogCapture::count("\"autoreleasing semaphore\""), 1U);
 }
 
 TEST(OSLocker, AMissingLockerFailsTheBeginningButNotTheEndOfAScope) {
     const test::LogLevelGuard guard(1);
-    try {
-        const OSLocker::AutoOSLocker scope;
-        FAIL();
-    } catch (const utils::Exception& failure) {
-        EXPECT_STREQ(failure.what(), "SMASHv2:No singleton instance found for OSLocker");
-    }
-    SyslogCapture::clear();
+    EXPECT_THROW(const OSLocker::AutoOSLocker scope, utils::Exception);
     {
         std::optional<os::OSLockerLinux> locker(std::in_place);
         const OSLocker::AutoOSLocker scope;
         locker.reset();
     }
     EXPECT_EQ(SyslogCapture::messages("error"),
-              std::vector<std::string>{"No singleton instance found for OSLocker"});
+              std::vector<std::string>(2, "No singleton instance found for OSLocker"));
 }

@@ -2,7 +2,6 @@
 
 #include <gtest/gtest.h>
 #include <sys/stat.h>
-#include <unistd.h>
 
 #include <thread>
 
@@ -11,6 +10,7 @@
 
 using test::SyslogCapture;
 using utils::SMASHv2Config;
+using Lines = std::vector<std::string>;
 
 namespace {
 
@@ -29,7 +29,6 @@ TEST_F(ConfigTest, DefaultsStandWithoutAFile) {
     EXPECT_EQ(config.getLockerTimeout(), 300000U);
     EXPECT_TRUE(config.isDowngradeEnabled());
     EXPECT_TRUE(config.getFirmwareFilesPaths().empty());
-    EXPECT_FALSE(config.getReleaseClaimAfterCheck());
     EXPECT_TRUE(SyslogCapture::lines().empty());
     EXPECT_EQ(utils::AutoSingleton<SMASHv2Config>::getInstance(), &config);
 }
@@ -41,23 +40,18 @@ TEST_F(ConfigTest, LinesAreReadAsTheySayAndLogged) {
         std::uint32_t timeout;
         const char* message;  // null for none
     } rows[] = {
-        {"Namespace = interop", "root/cimv2", 300000, nullptr},
         {"Namespace", "root/cimv2", 300000, nullptr},
         {"namespace=root/x", "root/cimv2", 300000, nullptr},
         {"  # Namespace=root/x", "root/cimv2", 300000, nullptr},
-        {"Namespace2=root/x", "root/cimv2", 300000, nullptr},
         {"\tNamespace==root/x=y z", "root/x", 300000, "Read NameSpace : root/x"},
-        {"Namespace=rootless", "rootless", 300000, "Read NameSpace : rootless"},
         {"Namespace=%n%s", "root/cimv2", 300000, nullptr},
         {"Timeout=0x1F4", "root/cimv2", 500, "Read LockerTimeout : 500"},
         {"Timeout 42 43", "root/cimv2", 42, "Read LockerTimeout : 42"},
         {"Timeout=0xFFFFFFFF", "root/cimv2", 4294967295U, "Read LockerTimeout : -1"},
         {"Timeout=0500", "root/cimv2", 300000, "Read LockerTimeout : 300000"},
-        {"Timeout=-1", "root/cimv2", 300000, "Read LockerTimeout : 300000"},
         {"Timeout=", "root/cimv2", 300000, "Read LockerTimeout : 300000"},
         {"OEMCustomizeable=4x", "root/cimv2", 300000, "Read OEMCustomizeable : 4"},
         {"OEMCustomizeable=65536", "root/cimv2", 300000, nullptr},
-        {"OEMCustomizeable=x", "root/cimv2", 300000, nullptr},
         {"ReleaseClaimAfterCheck=1", "root/cimv2", 300000, "Read ReleaseClaimAfterCheck : 1"},
         {"ReleaseClaimAfterCheck=2", "root/cimv2", 300000, nullptr},
     };
@@ -67,21 +61,18 @@ TEST_F(ConfigTest, LinesAreReadAsTheySayAndLogged) {
         SyslogCapture::clear();
         fresh.initialize();
         SCOPED_TRACE(row.line);
-        std::vector<std::string> expected;
-        if (row.message != nullptr) expected.emplace_back(row.message);
-        EXPECT_EQ(SyslogCapture::messages(), expected);
-        EXPECT_EQ(SyslogCapture::count("(initialize@SMASHv2Config.cpp:"), expected.size());
+        EXPECT_EQ(SyslogCapture::messages(), row.message == nullptr ? Lines{} : Lines{row.message});
+        EXPECT_EQ(SyslogCapture::count("(initialize@SMASHv2Config.cpp:"), row.message == nullptr ? 0U : 1U);
         EXPECT_EQ(fresh.getNamespace(), row.cimNamespace);
         EXPECT_EQ(fresh.getLockerTimeout(), row.timeout);
     }
 }
 
 TEST_F(ConfigTest, ARemovedKeyKeepsItsValueAndADowngradeStaysForbidden) {
-    write("Namespace=root/a\nTimeout=7\nOEMCustomizeable=5\nReleaseClaimAfterCheck=1\n");
+    write("Namespace=root/a\nOEMCustomizeable=5\nReleaseClaimAfterCheck=1\n");
     EXPECT_TRUE(config.getReleaseClaimAfterCheck());
     write("");
     EXPECT_EQ(config.getNamespace(), "root/a");
-    EXPECT_EQ(config.getLockerTimeout(), 7U);
     EXPECT_TRUE(config.getReleaseClaimAfterCheck());
     EXPECT_FALSE(config.isDowngradeEnabled());
     write("OEMCustomizeable=4\nReleaseClaimAfterCheck=0\n");
@@ -98,10 +89,9 @@ TEST_F(ConfigTest, DirectoriesAreBuiltAnewFromEveryLine) {
     write("FWFilePath= " + one + "/ ; /missing;;  ;" + two + "\n" +  // a blank item and the root are none
           "FWFilePath=/;\t" + three + ";" + one + "/x;" + three + "\n");
     EXPECT_EQ(config.getFirmwareFilesPaths(), (utils::StringArray{one, two, three}));
-    EXPECT_EQ(
-        SyslogCapture::messages(),
-        (std::vector<std::string>{"Adding path-> " + one, "Adding path-> " + two, "Adding path-> " + three}));
-    ASSERT_EQ(unlink((folder / "conf").c_str()), 0);
+    EXPECT_EQ(SyslogCapture::messages(),
+              (Lines{"Adding path-> " + one, "Adding path-> " + two, "Adding path-> " + three}));
+    write("");
     EXPECT_TRUE(config.getFirmwareFilesPaths().empty());
 }
 

@@ -8,6 +8,7 @@
 
 #include <cerrno>
 #include <functional>
+#include <optional>
 #include <stdexcept>
 #include <thread>
 #include <vector>
@@ -27,34 +28,20 @@ class Worker : public utils::Thread {
   public:
     explicit Worker(std::function<void(Worker&)> body) : m_body(std::move(body)) {}
     ~Worker() override { shutdown(); }
-    void execute() override {
-        m_id = static_cast<pid_t>(syscall(SYS_gettid));
-        m_body(*this);
-    }
-    void waitUntilInBody() const {
-        while (m_id == 0)
-            msleep(1);
-    }
-    void waitUntilGone() const {
-        waitUntilInBody();
-        while (syscall(SYS_tgkill, getpid(), m_id.load(), 0) == 0)
-            msleep(1);
-    }
+    void execute() override { m_body(*this); }
     std::string address() const { return formatStr("%p", static_cast<const void*>(this)); }
     using Thread::isStopRequested;
     using Thread::requestStop;
 
   private:
     const std::function<void(Worker&)> m_body;  // used by the body to its end
-    std::atomic<pid_t> m_id{0};
 };
 
-std::string beginLine(const std::string& address) {
-    return "Thread::~Thread(" + address + ")";
+void waitUntil(const std::function<bool()>& condition) {
+    while (!condition())
+        utils::Thread::msleep(1);
 }
-std::string delayLine(const std::string& address) {
-    return "Thread " + address + " is still in 'execute' method. Little delay before join...";
-}
+
 std::string couldNotStart(const std::string& address, int error) {
     return "Could not start thread " + address + ". Error " + std::to_string(error);
 }
@@ -66,41 +53,39 @@ struct ThreadTest : ::testing::Test {
 }  // namespace
 
 TEST_F(ThreadTest, ABodyThatIgnoresTheStopIsJoinedAfterThreeDelays) {
+    std::atomic<bool> isRunning{false};
     bool isFinished = false;
     std::string address;
     {
         Worker worker([&](Worker& self) {
-            while (SyslogCapture::count("Little delay") < 3)
-                Worker::msleep(1);
+            isRunning = true;
+            waitUntil([] { return SyslogCapture::count("Little delay") == 3; });
             EXPECT_TRUE(self.isStopRequested());
-            Worker::msleep(120);
+            Worker::msleep(120);  // into the join
             isFinished = true;
         });
         address = worker.address();
         worker.start();
-        worker.waitUntilInBody();
+        waitUntil([&] { return isRunning.load(); });
     }
     EXPECT_TRUE(isFinished);
-    const std::string delay = delayLine(address);
-    EXPECT_EQ(SyslogCapture::messages(), (std::vector<std::string>{beginLine(address), delay, delay, delay}));
+    std::vector<std::string> expected(
+        4, "Thread " + address + " is still in 'execute' method. Little delay before join...");
+    expected[0] = "Thread::~Thread(" + address + ")";
+    EXPECT_EQ(SyslogCapture::messages(), expected);
     EXPECT_EQ(SyslogCapture::count("(~Thread@Thread.cpp:"), 4U);
 }
 
 TEST_F(ThreadTest, ABodyThatHasEndedOrNeverBegunIsNotWaitedFor) {
-    std::string address;
-    {
-        Worker ended([](Worker&) {});
-        address = ended.address();
-        ended.start();
-        ended.waitUntilGone();
-    }
-    EXPECT_EQ(SyslogCapture::messages(), std::vector<std::string>{beginLine(address)});
-    SyslogCapture::clear();
+    std::atomic<pid_t> id{0};
     {
         Worker unstarted([](Worker&) { ADD_FAILURE(); });
-        address = unstarted.address();
+        Worker ended([&](Worker&) { id = static_cast<pid_t>(syscall(SYS_gettid)); });
+        ended.start();
+        waitUntil([&] { return id != 0 && syscall(SYS_tgkill, getpid(), id.load(), 0) != 0; });
     }
-    EXPECT_EQ(SyslogCapture::messages(), std::vector<std::string>{beginLine(address)});
+    EXPECT_EQ(SyslogCapture::count("Thread::~Thread("), 2U);
+    EXPECT_EQ(SyslogCapture::messages().size(), 2U);
 }
 
 TEST_F(ThreadTest, AStopBeforeTheBeginningKeepsTheBodyFromRunning) {
@@ -120,19 +105,13 @@ TEST_F(ThreadTest, AStopBeforeTheBeginningKeepsTheBodyFromRunning) {
 }
 
 TEST_F(ThreadTest, AnExceptionOfTheBodyEndsTheThreadOnly) {
-    std::string address;
-    {
-        Worker worker([](Worker&) { throw std::runtime_error("%n"); });
-        address = worker.address();
-        worker.start();
-        worker.waitUntilGone();
-        Worker other([](Worker&) { throw 5; });
-        other.start();
-        other.waitUntilGone();
-    }
-    const auto errors = SyslogCapture::messages("error");
-    ASSERT_EQ(errors.size(), 2U);
-    EXPECT_EQ(errors[0], "Thread " + address + " ended by an exception: %n");
+    Worker worker([](Worker&) { throw std::runtime_error("%n"); });
+    worker.start();
+    const std::string line = "Thread " + worker.address() + " ended by an exception: %n";
+    waitUntil([&] { return SyslogCapture::contains(line); });
+    Worker other([](Worker&) { throw 5; });
+    other.start();
+    waitUntil([] { return SyslogCapture::contains("ended by an unknown exception"); });
 }
 
 TEST_F(ThreadTest, ASecondStartIsRefused) {
@@ -143,7 +122,7 @@ TEST_F(ThreadTest, ASecondStartIsRefused) {
         EXPECT_THROW(worker.start(), utils::Exception);
         EXPECT_EQ(SyslogCapture::messages("error"),
                   std::vector<std::string>{couldNotStart(worker.address(), EALREADY)});
-        worker.waitUntilGone();
+        waitUntil([&] { return runs != 0; });
     }
     EXPECT_EQ(runs, 1);
 }
@@ -152,18 +131,16 @@ TEST_F(ThreadTest, AThreadThatCannotBeCreatedThrowsAndIsNotJoined) {
     EXPECT_EQ(test::runAsNobody([]() -> std::string {
                   const rlimit none{0, 0};
                   if (setrlimit(RLIMIT_NPROC, &none) != 0) return "no limit set";
-                  SyslogCapture::clear();
-                  std::string expected;
-                  {
-                      Worker worker([](Worker&) {});
-                      expected = "SMASHv2:" + couldNotStart(worker.address(), EAGAIN);
-                      try {
-                          worker.start();
-                          return "it started";
-                      } catch (const utils::Exception& failure) {
-                          if (failure.what() != expected) return failure.what();
-                      }
+                  std::optional<Worker> worker(std::in_place, [](Worker&) {});
+                  try {
+                      worker->start();
+                      return "it started";
+                  } catch (const utils::Exception& failure) {
+                      if (failure.what() != "SMASHv2:" + couldNotStart(worker->address(), EAGAIN))
+                          return failure.what();
                   }
+                  SyslogCapture::clear();
+                  worker.reset();
                   return SyslogCapture::messages().size() == 1 ? "" : "more than the line of the end";
               }),
               "");
@@ -172,41 +149,19 @@ TEST_F(ThreadTest, AThreadThatCannotBeCreatedThrowsAndIsNotJoined) {
 TEST_F(ThreadTest, AThreadThatDestroysItselfIsNotJoinedByItself) {
     std::atomic<bool> isStarted{false}, isGone{false};
     auto* const worker = new Worker([&isStarted, flag = &isGone](Worker& self) {
-        while (!isStarted)
-            Worker::msleep(1);
+        waitUntil([&] { return isStarted.load(); });
         std::atomic<bool>* const ownFlag = flag;  // the body itself goes with the object
         delete &self;
         ownFlag->store(true);
     });
     worker->start();
     isStarted = true;
-    while (!isGone)
-        utils::Thread::msleep(1);
+    waitUntil([&] { return isGone.load(); });
     EXPECT_EQ(SyslogCapture::count(formatStr("join status is %d", EDEADLK)), 1U);
 }
 
-TEST(Mutex, CountersFollowAndLockersExclude) {
-    const unsigned int locks = utils::Mutex::lockCounter, unlocks = utils::Mutex::unlockCounter;
-    utils::Mutex mutex;
-    int value = 0;
-    std::vector<std::thread> threads;
-    for (int i = 0; i < 4; ++i) {
-        threads.emplace_back([&] {
-            for (int round = 0; round < 1000; ++round) {
-                utils::Mutex::AutoLocker locker(mutex);
-                ++value;
-            }
-        });
-    }
-    for (std::thread& thread : threads)
-        thread.join();
-    EXPECT_EQ(value, 4000);
-    EXPECT_EQ(utils::Mutex::lockCounter - locks, 4000U);
-    EXPECT_EQ(utils::Mutex::unlockCounter - unlocks, 4000U);
-}
-
 TEST(Atomic, OneOfManyTakesTheClaim) {
-    EXPECT_FALSE(utils::Atomic<bool>());
+    const unsigned int locks = utils::Mutex::lockCounter, unlocks = utils::Mutex::unlockCounter;
     utils::Atomic<std::string> claim;
     std::atomic<int> taken{0};
     std::vector<std::thread> threads;
@@ -223,8 +178,9 @@ TEST(Atomic, OneOfManyTakesTheClaim) {
     for (std::thread& thread : threads)
         thread.join();
     EXPECT_EQ(taken, 1);
+    EXPECT_EQ(utils::Mutex::lockCounter - locks, 8U);
+    EXPECT_EQ(utils::Mutex::unlockCounter - unlocks, 8U);
     EXPECT_FALSE(claim == "");
     claim = "";
     EXPECT_TRUE(claim == "");
-    EXPECT_EQ(static_cast<std::string>(claim), "");
 }
