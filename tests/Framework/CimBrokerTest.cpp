@@ -4,6 +4,7 @@
 
 #include <chrono>
 #include <future>
+#include <thread>
 
 #include "Framework/RequestScope.h"
 #include "Support/TestModel.h"
@@ -30,26 +31,17 @@ TEST(CimBroker, JoinsTheAgentsThatServeAClass) {
     EXPECT_EQ(countGadgets(""), 3U);
     EXPECT_EQ(countGadgets("Two"), 2U);
     EXPECT_EQ(countGadgets("Three"), 0U);
-    EXPECT_EQ(GetCimBroker()->getInstances("Unknown", "").size(), 0U);
+    EXPECT_EQ(GetCimBroker()->getInstances("Test_Thing", "").size(), 0U);
+    EXPECT_EQ(one.getInstances("Unknown").first(), nullptr);
 
     core::CimPath path(std::string("root/cimv2:TEST_GADGET.number=0,id=\"c\""));
     const core::CimInstance* found = GetCimBroker()->getInstanceByPath(path);
     ASSERT_NE(found, nullptr);
     EXPECT_TRUE(path.names(*found));
-    for (const char* text :
-         {"Test_Gadget.ID=\"d\",Number=0", "Test_Gadget.ID=\"c\"", "Other.ID=\"c\",Number=0", "!"}) {
+    for (const char* text : {"Test_Gadget.ID=\"d\",Number=0", "Test_Gadget.ID=\"c\"", "!"}) {
         core::CimPath absent{std::string(text)};
         EXPECT_EQ(GetCimBroker()->getInstanceByPath(absent), nullptr) << text;
     }
-}
-
-TEST(CimBroker, AnAgentAnswersByTheClassName) {
-    test::GadgetAgent agent;
-    agent.add("a");
-    EXPECT_TRUE(agent.isClassSupported("test_link"));
-    EXPECT_FALSE(agent.isClassSupported("Test_Thing"));
-    EXPECT_EQ(agent.getInstances("TEST_gadget").size(), 1U);
-    EXPECT_EQ(agent.getInstances("Unknown").first(), nullptr);
 }
 
 TEST(CimBroker, AnAgentWaitsForTheRequestsThatUseIt) {
@@ -66,13 +58,14 @@ TEST(CimBroker, AnAgentWaitsForTheRequestsThatUseIt) {
     });
     enumerated.get_future().wait();
     auto leaving = std::async(std::launch::async, [&] { agent.reset(); });
-    EXPECT_EQ(leaving.wait_for(std::chrono::milliseconds(50)), std::future_status::timeout);
+    while (countGadgets("") != 0)
+        std::this_thread::yield();
+    EXPECT_EQ(leaving.wait_for(std::chrono::seconds(0)), std::future_status::timeout);
     EXPECT_EQ(test::Gadget::living, 1);
     proceed.set_value();
     EXPECT_EQ(request.get(), "held");
     leaving.wait();
     EXPECT_EQ(test::Gadget::living, 0);
-    EXPECT_EQ(countGadgets(""), 0U);
 }
 
 }  // namespace
