@@ -1,7 +1,5 @@
 #include <gtest/gtest.h>
 
-#include <thread>
-
 #include "Framework/CimError.h"
 #include "Support/TestModel.h"
 
@@ -70,23 +68,6 @@ TEST(CimProperty, AReferenceOutlivesItsTarget) {
     list.clear();
     EXPECT_EQ(link.From.getInstance(), nullptr);
     EXPECT_EQ(link.From.toString(), "Test_Gadget.ID=\"t\",Number=0");
-}
-
-TEST(CimProperty, ARefreshIsSeenWholeOrNotAtAll) {
-    test::Gadget gadget;
-    std::thread writer([&] {
-        for (unsigned short i = 0; i < 2000; ++i) {
-            const core::RecursiveLocker lock(gadget.getMutex());
-            gadget.Codes = std::vector<unsigned short>(3, i);
-            gadget.Number = i;
-        }
-    });
-    for (int i = 0; i < 2000; ++i) {
-        const core::RecursiveLocker lock(gadget.getMutex());
-        const auto codes = gadget.Codes.get();
-        ASSERT_TRUE(codes.empty() || codes.back() == gadget.Number.get());
-    }
-    writer.join();
 }
 
 }  // namespace

@@ -10,8 +10,6 @@
 
 namespace {
 
-using ma::AdapterDescription;
-
 std::string errorOf(const std::function<void()>& action) {
     try {
         action();
@@ -21,103 +19,74 @@ std::string errorOf(const std::function<void()>& action) {
     return "no error";
 }
 
-/// An adapter that is in order, with one line more.
-std::string adapterWith(const std::string& line) {
-    return "[[adapter]]\nname = \"eth0\"\npci_address = \"0000:03:00.0\"\npci_id = \"1af4:1041\"\n"
-           "mac = \"52:54:00:12:34:56\"\n" +
-           line + "\n";
+std::string adapterAt(const std::string& address) {
+    return "[[adapter]]\nname = \"eth0\"\npci_address = \"" + address +
+           "\"\npci_id = \"1af4:1041\"\nmac = \"52:54:00:12:34:56\"\n";
 }
 
-TEST(AdapterDescription, everyKeyIsTaken) {
-    const std::string text = adapterWith(R"(description = "a card"
-subsystem_id = "1af4:1100"
-speed = 10_000_000_000
-link = false
-updatable = false
+/// An adapter that is in order, with one line more.
+std::string adapterWith(const std::string& line) {
+    return adapterAt("0000:03:00.0") + line + "\n";
+}
+
+TEST(AdapterDescription, keysThatFewAdaptersHaveAreTaken) {
+    const std::string text = adapterWith(R"(subsystem_id = "1af4:1100"
 write_speed = 500_000
 boot_type = "fcoe"
-flash_file = "card.rom"
 components = [ { type = "IMG_CLP", revision = 65535 }, { type = "IMG_UEFI" } ]
 [[adapter.fault]]
 at = "capability-word"
 action = "stall"
 milliseconds = 5
 once = true
-[[adapter.fault]]
-at = "write"
-action = "fail"
-percent = 50
-code = 77
 text = "bank gone")");
-    const std::vector<AdapterDescription> adapters = ma::parseAdapterDescriptions(text, "a.toml");
-    ASSERT_EQ(1U, adapters.size());
-    const AdapterDescription& adapter = adapters[0];
-    EXPECT_EQ((utils::PCIAddr{3, 0, 0, false, "0000:03:00.0"}), adapter.address);
+    const ma::AdapterDescription adapter = ma::parseAdapterDescriptions(text, "a.toml").at(0);
     EXPECT_EQ("1af4:1100", ma::formatIds(adapter.ids.subsystemVendor, adapter.ids.subsystemDevice));
-    EXPECT_EQ((std::array<uint8_t, 6>{0x52, 0x54, 0, 0x12, 0x34, 0x56}), adapter.mac);
-    EXPECT_EQ(10'000'000'000U, adapter.speed);
     EXPECT_EQ(500'000U, adapter.writeSpeed);
-    EXPECT_FALSE(adapter.linkUp || adapter.canBeUpdated);
     EXPECT_EQ(ma::BootType::FCoE, adapter.bootType);
     EXPECT_EQ("IMG_CLP 65535, IMG_UEFI 1", test::describeComponents(adapter.components));
-    ASSERT_EQ(2U, adapter.faults.size());
-    EXPECT_EQ(ma::Operation::CapabilityWord, adapter.faults[0].at);
-    EXPECT_EQ(ma::Fault::Action::Stall, adapter.faults[0].action);
-    EXPECT_TRUE(adapter.faults[0].once && adapter.faults[0].milliseconds == 5);
-    EXPECT_EQ(50, adapter.faults[1].percent);
-    EXPECT_EQ(77U, adapter.faults[1].code);
-    EXPECT_EQ("bank gone", adapter.faults[1].text);
+    const ma::Fault& fault = adapter.faults.at(0);
+    EXPECT_EQ(ma::Operation::CapabilityWord, fault.at);
+    EXPECT_EQ(ma::Fault::Action::Stall, fault.action);
+    EXPECT_TRUE(fault.once && fault.milliseconds == 5 && fault.text == "bank gone");
 }
 
-TEST(AdapterDescription, addressesWithoutDomainOrFunction) {
+TEST(AdapterDescription, addresses) {
     const auto addressOf = [](const std::string& address) {
-        std::string text = adapterWith("");
-        text.replace(text.find("0000:03:00.0"), 12, address);
-        return ma::parseAdapterDescriptions(text, "a.toml").at(0).address;
+        return ma::parseAdapterDescriptions(adapterAt(address), "a.toml").at(0).address;
     };
     EXPECT_EQ((utils::PCIAddr{0x1f, 0x1e, 7, false, "0000:1f:1e.7"}), addressOf("1f:1e.7"));
     EXPECT_EQ((utils::PCIAddr{0x1f, 0x1e, 0, true, "0001:1f:1e"}), addressOf("0001:1F:1e"));
+    for (const char* address :
+         {"0000:03:00.8", "0000:03:20.0", "0000:3:00.0", "03:00.", "03:00.0x", "", ":::"})
+        EXPECT_THROW(addressOf(address), ma::AdapterError) << address;
 }
 
 TEST(AdapterDescription, mistakesAreNamedWithPlaceAndRemedy) {
     const std::pair<std::string, const char*> table[] = {
         {"[[adapter]]\nname =", "a.toml, line 2: "},
         {"\n[adaptor]", "a.toml, line 2: adapter description: unknown key \"adaptor\"; the keys are adapter"},
-        {"adapter = 1", "line 1: adapter description: \"adapter\" must be a list of tables"},
-        {"adapter = [ 1 ]", "must be a list of tables"},
+        {"adapter = [ 1 ]", "line 1: adapter description: \"adapter\" must be a list of tables"},
         {"a = 1\n\xEF\xB7\xB6", "a.toml, line 2: "},  // U+FDB6 and a letter: see MidAPI/Toml.h
         {"a = [[1\n\xD2\x99]]", "a.toml, line 2: "},
         {"[[adapter]]", "line 1: adapter 1: \"name\" is missing; write for example name = \"eth0\""},
         {"[[adapter]]\nname = 7", "line 2: adapter 1: \"name\" must be a text in quotes"},
-        {"[[adapter]]\nname = \"\"", "it must be 1 to 64 bytes"},
         {"[[adapter]]\nname = \"a\\nb\"", "\"name\" is \"a?b\""},
-        {"[[adapter]]\nname = \"eth0\"", "adapter \"eth0\": \"pci_address\" is missing"},
+        {adapterAt("03"), "must be like \"0000:03:00.0\""},
         {adapterWith("speeed = 1"), "line 6: adapter \"eth0\": unknown key \"speeed\""},
         {adapterWith("speed = -1"), "\"speed\" must be a whole number from 0 to"},
-        {adapterWith("speed = \"fast\""), "\"speed\" must be a whole number"},
         {adapterWith("link = 1"), "\"link\" must be true or false"},
-        {adapterWith("boot_type = \"disk\""),
-         "\"boot_type\" is \"disk\", it must be none, pxe, iscsi, fcoe or uefi"},
+        {adapterWith("boot_type = \"disk\""), "is \"disk\", it must be none, pxe, iscsi, fcoe or uefi"},
         {adapterWith("subsystem_id = \"1af4\""), "\"subsystem_id\" is \"1af4\", it must be like"},
         {adapterWith("components = [ { revision = 1 } ]"), "a component of \"eth0\": \"type\" is missing"},
-        {adapterWith("components = [ { type = \"IMG_X\" } ]"), "it must be IMG_CLP, IMG_iSCSI"},
         {adapterWith("components = [ { type = \"IMG_PXE\", revision = 65536 } ]"), "from 0 to 65535"},
         {adapterWith("[[adapter.fault]]\naction = \"kill\""), "a fault of \"eth0\": \"at\" is missing"},
-        {adapterWith("[[adapter.fault]]\nat = \"write\"\naction = \"burn\""),
-         "line 8: a fault of \"eth0\": \"action\""},
-        {adapterWith("[[adapter.fault]]\nat = \"write\"\naction = \"fail\"\npercent = 101"), "from 0 to 100"},
+        {adapterWith("[[adapter.fault]]\nat = \"write\"\naction = \"burn\""), "line 8: a fault of \"eth0\""},
         {adapterWith("") + adapterWith(""), "two adapters are called \"eth0\""},
     };
     for (const auto& [text, expected] : table) {
         const std::string error = errorOf([&text = text] { ma::parseAdapterDescriptions(text, "a.toml"); });
         EXPECT_NE(std::string::npos, error.find(expected)) << error << "\n" << text;
-    }
-    for (const char* address :
-         {"0000:03:00.8", "0000:03:20.0", "0000:3:00.0", "03:00.", "03:00.0x", "", ":::", "03"}) {
-        std::string text = adapterWith("");
-        text.replace(text.find("0000:03:00.0"), 12, address);
-        const std::string error = errorOf([&] { ma::parseAdapterDescriptions(text, "a.toml"); });
-        EXPECT_NE(std::string::npos, error.find("must be like \"0000:03:00.0\"")) << error;
     }
 }
 

@@ -15,28 +15,19 @@ using Rom = std::vector<uint8_t>;
 using Types = std::vector<FirmwareType>;
 
 constexpr FirmwareType NO_TYPE = FirmwareType::None;
+constexpr auto NO_SUCH = static_cast<FirmwareType>(77);
 constexpr FirmwareType CLP = FirmwareType::CLP;
 constexpr FirmwareType ISCSI = FirmwareType::iSCSI;
 constexpr FirmwareType PXE = FirmwareType::PXE;
 constexpr FirmwareType UEFI = FirmwareType::UEFI;
 
-Rom wrongClass() {
-    ma::NewRomImage vga;
-    vga.type = PXE;
-    vga.vendorId = 0x1af4;
-    vga.deviceId = 0x1041;
-    vga.classCode = 0x030000;
-    return ma::makeRomImage(vga);
-}
-
-Rom withDeviceList(uint16_t device, std::vector<uint16_t> others) {
-    ma::NewRomImage image;
-    image.type = PXE;
-    image.vendorId = 0x1af4;
-    image.deviceId = device;
-    image.furtherDeviceIds = std::move(others);
-    image.codeRevision = 1;
-    return ma::makeRomImage(image);
+Rom pxeFor(uint16_t device, std::vector<uint16_t> others, uint32_t classCode = ma::rom::ETHERNET_CLASS) {
+    return ma::makeRomImage({.type = PXE,
+                             .vendorId = 0x1af4,
+                             .deviceId = device,
+                             .furtherDeviceIds = std::move(others),
+                             .codeRevision = 1,
+                             .classCode = classCode});
 }
 
 Rom cutShort(Rom rom, std::size_t length) {
@@ -54,76 +45,47 @@ struct Case {
     const char* reason;  // a part of the logged line
 };
 
-std::vector<Case> realImageCases() {
+std::vector<Case> allCases() {
     const Rom virtio = test::realRom("efi-virtio");
     const Rom pxeOnly = test::realRom("pxe-virtio");
+    const Rom vmxnet = test::realRom("efi-vmxnet3");
+    const Rom older = test::madeRom({{PXE, 0}, {UEFI, 0}});
+    const Rom olderAndMore = test::madeRom({{PXE, 0}, {ISCSI, 1}});
+    const Rom clp = test::madeRom({{CLP, 1}});
     return {
         {"equal is fit", "eth0", virtio, {}, 0, {PXE, UEFI}, ""},
-        {"newer is fit", "eth0", test::withRevision(virtio, 2), {}, 0, {PXE, UEFI}, ""},
         {"one of two", "eth0", virtio, {UEFI}, 0, {UEFI}, ""},
         {"the other one; type 0 and repeats ignored", "eth0", virtio, {PXE, NO_TYPE, PXE}, 0, {PXE}, ""},
         {"only type 0 stands for all", "eth0", virtio, {NO_TYPE}, 0, {PXE, UEFI}, ""},
         {"ascending, whatever the order", "eth0", virtio, {UEFI, PXE}, 0, {PXE, UEFI}, ""},
         {"a file with less than the adapter", "eth0", pxeOnly, {}, 0, {PXE}, ""},
-        {"the second function of the card", "eth1", virtio, {}, 0, {PXE, UEFI}, ""},
         {"other card", "eth2", virtio, {}, 2, {}, "is for PCI device 1af4:1041, the adapter is 10ec:8139"},
         {"other card, cut short", "eth2", cutShort(virtio, 100'000), {}, 2, {}, "1af4:1041"},
-        {"its own card", "eth2", test::realRom("efi-rtl8139"), {}, 0, {PXE, UEFI}, ""},
         {"images that disagree", "eth0", test::realRom("efi-ne2k_pci"), {}, 2, {}, "0000:0000"},
         {"cannot be updated", "eth3", test::realRom("pxe-pcnet"), {}, 2, {}, "cannot be updated"},
-        {"other types",
-         "eth4",
-         test::realRom("efi-vmxnet3"),
-         {},
-         4,
-         {PXE, UEFI},
-         "carries IMG_iSCSI, IMG_UEFI"},
-        {"the types it has", "eth4", test::realRom("efi-vmxnet3"), {UEFI}, 0, {UEFI}, ""},
+        {"other types", "eth4", vmxnet, {}, 4, {PXE, UEFI}, "carries IMG_iSCSI, IMG_UEFI"},
+        {"the types it has", "eth4", vmxnet, {UEFI}, 0, {UEFI}, ""},
         {"cut short", "eth0", cutShort(virtio, 100'000), {}, 1, {}, "cut short"},
         {"cut at an image's end", "eth0", cutShort(virtio, 75'776), {PXE}, 1, {PXE}, "cut short"},
         {"empty", "eth0", {}, {}, 1, {}, "the file is empty"},
         {"no such adapter", "eth9", virtio, {}, 1, {}, "no such adapter"},
-        {"a type the file has not",
-         "eth0",
-         virtio,
-         {ISCSI, PXE},
-         5,
-         {ISCSI, PXE},
-         "no image of type IMG_iSCSI"},
-        {"a number that is no type",
-         "eth0",
-         virtio,
-         {static_cast<FirmwareType>(77)},
-         5,
-         {static_cast<FirmwareType>(77)},
-         "no image of type 77"},
-    };
-}
-
-std::vector<Case> madeImageCases() {
-    const Rom older = test::madeRom({{PXE, 0}, {UEFI, 0}});
-    const Rom olderAndMore = test::madeRom({{PXE, 0}, {ISCSI, 1}});
-    const Rom clp = test::madeRom({{CLP, 1}});
-    return {
+        {"a type it lacks", "eth0", virtio, {ISCSI, PXE}, 5, {ISCSI, PXE}, "no image of type IMG_iSCSI"},
+        {"a number that is no type", "eth0", virtio, {NO_SUCH}, 5, {NO_SUCH}, "no image of type 77"},
         {"older", "eth0", older, {}, 3, {PXE, UEFI}, "IMG_PXE would go back from version 1 (installed) to 0"},
         {"the part that is not older", "eth0", older, {UEFI}, 0, {UEFI}, ""},
         {"older with other types", "eth0", olderAndMore, {}, 4, {ISCSI, PXE}, "adapter carries"},
         {"missing type before older", "eth0", older, {ISCSI}, 5, {ISCSI}, "it has IMG_PXE, IMG_UEFI"},
         {"CLP is a type of its own", "eth0", clp, {}, 4, {CLP, PXE}, "IMG_CLP, IMG_PXE"},
         {"and brings its image", "eth0", clp, {CLP}, 4, {CLP, PXE}, ""},
-        {"VGA", "eth0", wrongClass(), {}, 2, {}, "not for a network adapter"},
-        {"listed device", "eth0", withDeviceList(0x1000, {0x1041}), {}, 0, {PXE}, ""},
-        {"not listed", "eth0", withDeviceList(0x1000, {0x1042, 0x1043}), {}, 2, {}, "1af4:1000"},
+        {"VGA", "eth0", pxeFor(0x1041, {}, 0x030000), {}, 2, {}, "not for a network adapter"},
+        {"listed device", "eth0", pxeFor(0x1000, {0x1041}), {}, 0, {PXE}, ""},
+        {"not listed", "eth0", pxeFor(0x1000, {0x1042, 0x1043}), {}, 2, {}, "1af4:1000"},
     };
 }
 
 TEST(ImagePreparation, answersByTheTable) {
     const test::SimulatedAdapters adapters;
-    const test::SyslogCapture log;
-    std::vector<Case> cases = realImageCases();
-    for (Case& made : madeImageCases())
-        cases.push_back(std::move(made));
-    for (const Case& one : cases) {
+    for (const Case& one : allCases()) {
         SCOPED_TRACE(one.what);
         test::SyslogCapture::clear();
         const test::PreparedImage prepared = test::prepareImage(one.adapter, one.file, one.requested);

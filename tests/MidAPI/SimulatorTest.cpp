@@ -5,10 +5,8 @@
 
 #include <algorithm>
 #include <atomic>
-#include <chrono>
 #include <cstdlib>
 #include <filesystem>
-#include <future>
 #include <set>
 #include <thread>
 
@@ -27,7 +25,6 @@ constexpr FirmwareType CLP = FirmwareType::CLP;
 constexpr FirmwareType ISCSI = FirmwareType::iSCSI;
 constexpr FirmwareType PXE = FirmwareType::PXE;
 constexpr FirmwareType UEFI = FirmwareType::UEFI;
-constexpr uint32_t PXE_AND_UEFI_BITS = 1U << 3 | 1U << 4;
 
 /// Prepares and writes; the prepare must allow it, if need be by force.
 test::WriteResult install(const std::string& adapter, const Rom& file, std::vector<FirmwareType> types = {}) {
@@ -43,13 +40,8 @@ TEST(Simulator, tellsWhatTheDescriptionSays) {
     EXPECT_FALSE(ma::getPCIAddress("eth0").sameAdapter(ma::getPCIAddress("eth2")));
     EXPECT_TRUE(ma::getCanBeUpdated("eth0"));
     EXPECT_FALSE(ma::getCanBeUpdated("eth3"));
-    EXPECT_EQ("IMG_iSCSI 1, IMG_UEFI 0", test::componentsOf("eth4"));
-    const ma::AdapterInfo info = ma::getAdapterInfo("eth0");
-    EXPECT_EQ((std::array<uint8_t, 6>{0x52, 0x54, 0, 0, 0, 0x10}), info.permanentMac);
-    EXPECT_EQ(10'000'000'000U, info.speed);
-    EXPECT_TRUE(info.linkUp);
-    EXPECT_EQ("1af4:1041", ma::formatIds(info.ids.vendor, info.ids.device));
-    EXPECT_EQ("IMG_PXE 1, IMG_UEFI 0", test::describeComponents(info.components));
+    const std::array<uint8_t, 6> mac{0x52, 0x54, 0, 0, 0, 0x10};
+    EXPECT_EQ(mac, ma::getAdapterInfo("eth0").permanentMac);
     EXPECT_FALSE(std::filesystem::exists(adapters.stateDirectory())) << "reading must not write";
 }
 
@@ -68,55 +60,35 @@ TEST(Simulator, unknownAdaptersAreRefused) {
     EXPECT_EQ("there is no adapter eth9", test::writeImage("eth9", {}).text);
 }
 
-TEST(Simulator, anUpdateIsReadBackAlsoAfterARestart) {
+TEST(Simulator, anUpdateReplacesItsTypesAndIsReadBackByAll) {
     test::SimulatedAdapters adapters;
+    ma::Simulator other(adapters.descriptionFile(), adapters.stateDirectory());
     const Rom newer = test::withRevision(test::realRom("efi-virtio"), 7);
     const test::WriteResult result = install("eth0", newer);
     EXPECT_TRUE(result.done && result.code == 0 && result.text.empty()) << result.text;
     EXPECT_EQ("IMG_PXE 7, IMG_UEFI 7", test::componentsOf("eth0"));
     EXPECT_EQ("IMG_PXE 1, IMG_UEFI 0", test::componentsOf("eth1")) << "each function has its own flash";
-    adapters.restart();
-    EXPECT_EQ("IMG_PXE 7, IMG_UEFI 7", test::componentsOf("eth0"));
-    EXPECT_EQ(newer, adapters->flashContent("eth0"));
-    EXPECT_EQ(3, test::prepareImage("eth0", test::realRom("efi-virtio")).status);
-    EXPECT_TRUE(install("eth0", test::realRom("efi-virtio")).done);
-    EXPECT_EQ("IMG_PXE 1, IMG_UEFI 0", test::componentsOf("eth0"));
-}
-
-TEST(Simulator, onlyTheWrittenTypesAreReplaced) {
-    const test::SimulatedAdapters adapters;
+    EXPECT_EQ(newer, other.flashContent("eth0"));
     EXPECT_TRUE(install("eth0", test::madeRom({{PXE, 5}, {UEFI, 6}}), {PXE}).done);
-    EXPECT_EQ("IMG_PXE 5, IMG_UEFI 0", test::componentsOf("eth0"));
     EXPECT_TRUE(install("eth0", test::madeRom({{ISCSI, 2}})).done);
-    EXPECT_EQ("IMG_iSCSI 2, IMG_PXE 5, IMG_UEFI 0", test::componentsOf("eth0"));
-}
-
-TEST(Simulator, anotherProcessSeesTheUpdate) {
-    const test::SimulatedAdapters adapters;
-    ma::Simulator other(adapters.descriptionFile(), adapters.stateDirectory());
-    std::vector<utils::FirmwareVersionInfo> components;
-    for (const uint32_t revision : {2U, 3U, 4U}) {
-        EXPECT_TRUE(install("eth0", test::madeRom({{PXE, revision}})).done);
-        ASSERT_TRUE(other.getAdapterFirmwareVersion("eth0", components));
-        EXPECT_EQ(revision, components.at(0).version);
-    }
+    adapters.restart();
+    EXPECT_EQ("IMG_iSCSI 2, IMG_PXE 5, IMG_UEFI 7", test::componentsOf("eth0"));
+    EXPECT_EQ(adapters->flashContent("eth0"), other.flashContent("eth0"));
 }
 
 TEST(Simulator, capabilityWordAndBootTypeAreKept) {
     test::SimulatedAdapters adapters;
     uint32_t code = 9;
     std::string text = "old";
-    EXPECT_EQ(PXE_AND_UEFI_BITS, adapters->flashState("eth0").capabilityWord);
+    EXPECT_EQ(0b11000U, adapters->flashState("eth0").capabilityWord);
     EXPECT_EQ(static_cast<uint32_t>(ma::BootType::iSCSI), adapters->flashState("eth4").bootType);
     EXPECT_TRUE(install("eth0", test::madeRom({{CLP, 2}})).done);
     EXPECT_TRUE(ma::updateCapabilityWord("eth0", {CLP, PXE, ISCSI}, code, text));
     EXPECT_TRUE(code == 0 && text.empty());
     EXPECT_TRUE(ma::setBootType("eth4", ma::BootType::None));
     adapters.restart();
-    EXPECT_EQ(PXE_AND_UEFI_BITS | 1U << 1, adapters->flashState("eth0").capabilityWord)
-        << "nothing that is not there";
+    EXPECT_EQ(0b11010U, adapters->flashState("eth0").capabilityWord) << "nothing that is not there";
     EXPECT_EQ(0U, adapters->flashState("eth4").bootType);
-    EXPECT_EQ("IMG_iSCSI 1, IMG_UEFI 0", test::componentsOf("eth4"));
 }
 
 TEST(Simulator, whatIsNoImageForTheCardIsNotWritten) {
@@ -129,10 +101,8 @@ TEST(Simulator, whatIsNoImageForTheCardIsNotWritten) {
     EXPECT_EQ(ma::ERROR_NOT_UPDATABLE,
               test::writeImage("eth3", test::madeRom({{PXE, 9}}, 0x1022, 0x2000)).code);
     EXPECT_EQ("IMG_PXE 1, IMG_UEFI 0", test::componentsOf("eth0"));
-}
 
-TEST(Simulator, moreImagesThanAChainMayHaveAreNotWritten) {
-    const test::SimulatedAdapters adapters;
+    // Nor is what makes the flash's chain longer than a chain may be.
     const auto images = [](FirmwareType type) {
         const Rom one = test::madeRom({{type, 9}});
         Rom many(40 * one.size());
@@ -172,21 +142,20 @@ TEST(Simulator, damageIsSurvivedWhereABankIsLeftAndNamedWhereNot) {
 }
 
 TEST(Simulator, namesOfAnyPrintableKindAreKeptApart) {
-    const std::string names[] = {"../eth0", "a/b", "\xC3\xA4 \\\"x\\\"", "%2e", "."};
     std::string description;
-    for (std::size_t index = 0; index < std::size(names); ++index)
-        description += "[[adapter]]\nname = \"" + names[index] + "\"\npci_address = \"0" +
-                       std::to_string(index) +
+    int bus = 10;
+    for (const std::string name : {"../eth0", "a/b", "\xC3\xA4 \\\"x\\\"", "%2e", "."})
+        description += "[[adapter]]\nname = \"" + name + "\"\npci_address = \"" + std::to_string(bus++) +
                        ":00.0\"\npci_id = \"1af4:1041\"\nmac = \"52:54:00:00:00:00\"\n";
     const test::SimulatedAdapters adapters(description);
     const utils::StringArray found = ma::enumerateAdapters();
-    ASSERT_EQ(std::size(names), found.size());
-    for (std::size_t index = 0; index < found.size(); ++index)
-        EXPECT_TRUE(install(found[index], test::madeRom({{PXE, static_cast<uint32_t>(index)}})).done);
-    for (std::size_t index = 0; index < found.size(); ++index)
+    ASSERT_EQ(5U, found.size());
+    for (uint32_t index = 0; index < 5; ++index)
+        EXPECT_TRUE(install(found[index], test::madeRom({{PXE, index}})).done);
+    for (uint32_t index = 0; index < 5; ++index)
         EXPECT_EQ("IMG_PXE " + std::to_string(index), test::componentsOf(found[index]));
     const auto folders = std::filesystem::directory_iterator(adapters.stateDirectory());
-    EXPECT_EQ(std::size(names), static_cast<std::size_t>(std::distance(begin(folders), end(folders))));
+    EXPECT_EQ(5, std::distance(begin(folders), end(folders)));
 }
 
 /// Looks at the progress from within every step of a write.
@@ -195,21 +164,16 @@ class WatchedFiles : public ma::FlashFiles {
     void write(int descriptor, std::span<const uint8_t> bytes) override {
         FlashFiles::write(descriptor, bytes);
         // From another thread, and with a prepare in between: neither may disturb the write.
-        std::async(std::launch::async, [this] {
-            seen.push_back(watched->getFlashImageUpdateProgress("eth0"));
-        }).wait();
+        std::thread([this] { seen.push_back(ma::getFlashImageUpdateProgress("eth0")); }).join();
         const Rom rom = test::madeRom({{PXE, 1}});
-        Rom output(rom.size());
-        auto size = static_cast<uint32_t>(rom.size());
-        std::vector<FirmwareType> types;
-        watched->prepareFlashImage("eth0", rom.data(), size, output.data(), &size, types);
-        uint32_t code = 0;
-        EXPECT_FALSE(watched->writeFlashImage("eth0", rom.data(), size, code, secondWrite));
+        EXPECT_EQ(0, test::prepareImage("eth0", rom).status);
+        const test::WriteResult second = test::writeImage("eth0", rom);
+        EXPECT_EQ("adapter eth0 is being written to by this process (" + std::to_string(::getpid()) +
+                      "); wait until it is done",
+                  second.text);
     }
 
-    ma::Simulator* watched = nullptr;
     std::vector<uint16_t> seen;
-    std::string secondWrite;
 };
 
 TEST(Simulator, progressMovesOnlyForward) {
@@ -217,7 +181,6 @@ TEST(Simulator, progressMovesOnlyForward) {
     const auto files = std::make_shared<WatchedFiles>();
     const auto simulator = std::make_shared<ma::Simulator>(
         ma::parseAdapterDescriptions(test::TEST_ADAPTERS, ""), folder.path(), files);
-    files->watched = simulator.get();
     const auto previous = ma::setBackend(simulator);
     const test::PreparedImage prepared = test::prepareImage("eth0", test::realRom("pxe-virtio"));
     EXPECT_EQ(0, ma::getFlashImageUpdateProgress("eth0"));
@@ -226,9 +189,6 @@ TEST(Simulator, progressMovesOnlyForward) {
     EXPECT_TRUE(std::is_sorted(files->seen.begin(), files->seen.end()));
     EXPECT_LT(15, std::set<uint16_t>(files->seen.begin(), files->seen.end()).size());
     EXPECT_EQ(99, files->seen.back()) << "100 only when it is in force";
-    EXPECT_EQ("adapter eth0 is being written to by this process (" + std::to_string(::getpid()) +
-                  "); wait until it is done",
-              files->secondWrite);
 
     simulator->injectFault("eth0", {.percent = 50, .code = 1, .text = "worn out"});
     EXPECT_EQ(0, test::prepareImage("eth0", test::realRom("pxe-virtio")).status);
@@ -243,16 +203,14 @@ TEST(Simulator, progressMovesOnlyForward) {
 
 TEST(Simulator, portsAreUpdatedAndReadAtOnce) {
     const test::SimulatedAdapters adapters;
-    constexpr uint16_t UPDATES = 8;
-    std::atomic<int> running = 3;
+    std::atomic<int> running = 2;
     std::vector<std::thread> threads;
-    for (const auto& [name, device] : {std::pair("eth0", "virtio"), {"eth1", "virtio"}, {"eth2", "rtl8139"}})
-        threads.emplace_back(
-            [&running, name = std::string(name), rom = test::realRom("pxe-" + std::string(device))] {
-                for (uint16_t revision = 1; revision <= UPDATES; ++revision)
-                    EXPECT_TRUE(install(name, test::withRevision(rom, revision)).done);
-                --running;
-            });
+    for (const char* name : {"eth0", "eth1"})
+        threads.emplace_back([&running, name, rom = test::realRom("pxe-virtio")] {
+            for (uint16_t revision = 1; revision <= 8; ++revision)
+                EXPECT_TRUE(install(name, test::withRevision(rom, revision)).done);
+            --running;
+        });
     for (int reader = 0; reader < 2; ++reader)
         threads.emplace_back([&running] {
             while (running > 0)
@@ -263,17 +221,8 @@ TEST(Simulator, portsAreUpdatedAndReadAtOnce) {
         });
     for (std::thread& thread : threads)
         thread.join();
-    for (const char* name : {"eth0", "eth1", "eth2"})
-        EXPECT_EQ("IMG_PXE 8, IMG_UEFI 0", test::componentsOf(name));
-}
-
-TEST(Simulator, writeSpeedIsKept) {
-    std::string description = test::TEST_ADAPTERS;
-    description.insert(description.find("name ="), "write_speed = 20_480\n");
-    const test::SimulatedAdapters adapters(description);
-    const auto begin = std::chrono::steady_clock::now();
-    EXPECT_TRUE(install("eth0", test::madeRom({{PXE, 2}, {UEFI, 2}})).done);
-    EXPECT_LE(std::chrono::milliseconds(99), std::chrono::steady_clock::now() - begin);  // 2048 bytes
+    EXPECT_EQ("IMG_PXE 8, IMG_UEFI 0", test::componentsOf("eth0"));
+    EXPECT_EQ("IMG_PXE 8, IMG_UEFI 0", test::componentsOf("eth1"));
 }
 
 TEST(Backend, isChosenByCallThenEnvironment) {
@@ -282,7 +231,6 @@ TEST(Backend, isChosenByCallThenEnvironment) {
     ::setenv("QUENX_ADAPTER_STATE", adapters.stateDirectory().c_str(), 1);
     const std::shared_ptr<ma::Backend> mine = ma::setBackend(nullptr);
     EXPECT_EQ(&*adapters, mine.get());
-    EXPECT_EQ(5U, ma::enumerateAdapters().size());
     EXPECT_TRUE(install("eth0", test::madeRom({{PXE, 8}})).done);
     EXPECT_EQ("IMG_PXE 8, IMG_UEFI 0", test::describeRom(adapters->flashContent("eth0")))
         << "the state is shared";

