@@ -16,17 +16,14 @@ namespace {
 using Action = ma::Fault::Action;
 using utils::FirmwareType;
 
-const std::vector<uint8_t>& newImage() {
-    static const std::vector<uint8_t> image = test::madeRom({{FirmwareType::PXE, 9}});
-    return image;
-}
+const std::vector<uint8_t> NEW_IMAGE = test::madeRom({{FirmwareType::PXE, 9}});
 
 /// Another process that writes to eth0 with a fault.
 pid_t startWriter(const test::SimulatedAdapters& adapters, const ma::Fault& fault) {
     const pid_t child = ::fork();
     if (child != 0) return child;
     adapters->injectFault("eth0", fault);
-    ::_exit(test::writeImage("eth0", newImage()).done ? 0 : 1);
+    ::_exit(test::writeImage("eth0", NEW_IMAGE).done ? 0 : 1);
 }
 
 int endOf(pid_t child) {
@@ -51,7 +48,7 @@ TEST(Processes, aKilledWriterLeavesTheOldImage) {
         ASSERT_TRUE(WIFSIGNALED(status) && WTERMSIG(status) == SIGKILL) << status;
         adapters.restart();
         EXPECT_EQ("IMG_PXE 1, IMG_UEFI 0", test::componentsOf("eth0"));
-        EXPECT_TRUE(test::writeImage("eth0", newImage()).done) << "the lock died with its holder";
+        EXPECT_TRUE(test::writeImage("eth0", NEW_IMAGE).done) << "the lock died with its holder";
         EXPECT_EQ("IMG_PXE 9, IMG_UEFI 0", test::componentsOf("eth0"));
     }
 }
@@ -61,16 +58,16 @@ TEST(Processes, oneWriterAtATimeAndItIsNamed) {
     const pid_t writer = startWriter(adapters, {.action = Action::Stall, .milliseconds = 60'000});
     waitForHolder(adapters, writer);
     if (HasFatalFailure()) return;
-    const test::WriteResult result = test::writeImage("eth0", newImage());
+    const test::WriteResult result = test::writeImage("eth0", NEW_IMAGE);
     EXPECT_EQ(ma::ERROR_BUSY, result.code);
     EXPECT_EQ(
         "adapter eth0 is being written to by process " + std::to_string(writer) + "; wait until it is done",
         result.text);
     // Nobody else waits for it: readers, settings, the card's other function.
     EXPECT_EQ("IMG_PXE 1, IMG_UEFI 0", test::componentsOf("eth0"));
-    EXPECT_EQ(0, test::prepareImage("eth0", newImage()).status);
+    EXPECT_EQ(0, test::prepareImage("eth0", NEW_IMAGE).status);
     EXPECT_TRUE(ma::setBootType("eth0", ma::BootType::None));
-    EXPECT_TRUE(test::writeImage("eth1", newImage()).done);
+    EXPECT_TRUE(test::writeImage("eth1", NEW_IMAGE).done);
     ::kill(writer, SIGKILL);
     endOf(writer);
 }
@@ -78,7 +75,7 @@ TEST(Processes, oneWriterAtATimeAndItIsNamed) {
 TEST(Processes, adaptersAnswerUntilTheProcessHasEnded) {
     // As a provider that is still loaded then: its destructor waits for the flash that runs.
     const auto provider = [] {
-        if (ma::enumerateAdapters().size() != 5 || !test::writeImage("eth0", newImage()).done) ::_exit(1);
+        if (ma::enumerateAdapters().size() != 5 || !test::writeImage("eth0", NEW_IMAGE).done) ::_exit(1);
     };
     const test::TempFolder folder;
     const std::string description = folder.write("adapters.toml", test::TEST_ADAPTERS);

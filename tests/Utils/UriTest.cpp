@@ -29,7 +29,6 @@ TEST(Uri, TextsGiveSchemePathAndLogLine) {
         {"file:", Scheme::Unknown, "", "Uknown URI format of 'file:'"},
         {"://x", Scheme::Unknown, "", "Uknown URI format of '://x'"},
         {" file:///x", Scheme::Unknown, "", "Uknown URI format of ' file:///x'"},
-        {"files:///x", Scheme::Unknown, "", "Uknown URI format of 'files:///x'"},
         {"/opt/%n%s", Scheme::Unknown, "", "Incorrect URI format of '/opt/%n%s'"},
         {"", Scheme::Unknown, "", nullptr},
     };
