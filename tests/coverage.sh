@@ -6,7 +6,7 @@ cd "$(dirname "${BASH_SOURCE[0]}")/.."
 export LC_ALL=C.UTF-8
 
 build=build/coverage
-programs=(UtilsTest LogMemoryTest SoftwareUpdateTest ReliabilityTest UnloadTest)
+programs=(UtilsTest SoftwareUpdateTest ReliabilityTest UnloadTest)
 cmake --preset coverage >/dev/null
 cmake --build "$build" -j "${JOBS:-$(nproc)}" --target "${programs[@]}"
 find "$build" -name '*.gcda' -delete

@@ -2,8 +2,6 @@
 
 #include <gtest/gtest.h>
 
-#include "Support/TestModel.h"
-
 namespace {
 
 using core::CimPath;
@@ -63,18 +61,6 @@ TEST(CimPath, ComparesNamesWithoutCaseAndValuesByType) {
     const CimPath value("Link", {{"From", core::CimScalar(CimPath(std::string("Thing.Name=\"x\"")))}});
     EXPECT_TRUE(value.names(CimPath(std::string("LINK.from=\"root/x:thing.NAME=\\\"x\\\"\""))));
     EXPECT_FALSE(value.names(CimPath(std::string("Link.From=\"Thing.Name=\\\"y\\\"\""))));
-}
-
-TEST(CimPath, NamesTheInstanceThatItWasTakenFrom) {
-    const test::Gadget one("quote\" and \\", 1);
-    const test::Gadget other("quote\" and \\", 2);
-    const CimPath path = CimPath::of(one);
-    EXPECT_EQ(path.toString(), "Test_Gadget.ID=\"quote\\\" and \\\\\",Number=1");
-    EXPECT_TRUE(CimPath(path.toString()).names(one));
-    EXPECT_FALSE(path.names(other));
-
-    const test::Link link(one, other);
-    EXPECT_TRUE(CimPath(CimPath::of(link).toString()).names(link));
 }
 
 }  // namespace

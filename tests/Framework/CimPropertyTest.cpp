@@ -20,16 +20,6 @@ TEST(CimProperty, StartsNullAndAssignmentEndsIt) {
     EXPECT_TRUE(gadget.ID.IsNull());
 }
 
-TEST(CimProperty, TheMostDerivedOfANameIsServed) {
-    test::Gadget gadget("x");
-    EXPECT_EQ(gadget.getPropertyByName("id"), &gadget.ID);
-    EXPECT_TRUE(static_cast<test::Thing&>(gadget).ID.IsNull());
-    std::string names;
-    for (const core::CimProperty* property : gadget.getProperties())
-        names += std::string(property->getName()) + " ";
-    EXPECT_EQ(names, "ID Number Caption Codes Made ");
-}
-
 TEST(CimProperty, ModificationChecksEverythingFirst) {
     test::Gadget gadget("x");
     gadget.Caption.setLengthBounds(2, 5);

@@ -58,7 +58,8 @@ TEST_F(CimRequestsTest, ReadsInstances) {
               CimStatus::InvalidParameter);
     const auto whole = m_requests.getInstance(CimPath::of(m_b));
     EXPECT_EQ(whole.path.toString(), "root/test:Test_Gadget.ID=\"b\",Number=2");
-    EXPECT_EQ(whole.properties.size(), 5U);
+    ASSERT_EQ(whole.properties.size(), 5U);  // of several of one name the most derived
+    EXPECT_FALSE(whole.properties[0].value.isNull());
     const auto part = m_requests.getInstance(CimPath::of(m_b), core::PropertyFilter({"caption", "Nonsense"}));
     ASSERT_EQ(part.properties.size(), 1U);
     EXPECT_EQ(std::get<std::string>(*part.properties[0].value.scalar()), "Gadget b");
@@ -135,7 +136,6 @@ TEST_F(CimRequestsTest, DeclaresWhatEachClassAdds) {
     for (const auto& property : chain[0]->properties)
         added += property.name + (property.isKey ? "! " : " ");
     EXPECT_EQ(added, "ID! Number! Made ");
-    EXPECT_EQ(chain[1]->properties.size(), 3U);
 
     EXPECT_EQ(m_requests.enumerateClasses("", true).size(), 3U);
     EXPECT_EQ(statusOf([&] { m_requests.getClass("Unknown"); }), CimStatus::NotFound);

@@ -31,8 +31,6 @@ std::string adapterWith(const std::string& line) {
 
 TEST(AdapterDescription, keysThatFewAdaptersHaveAreTaken) {
     const std::string text = adapterWith(R"(subsystem_id = "1af4:1100"
-write_speed = 500_000
-boot_type = "fcoe"
 components = [ { type = "IMG_CLP", revision = 65535 }, { type = "IMG_UEFI" } ]
 [[adapter.fault]]
 at = "capability-word"
@@ -42,12 +40,9 @@ once = true
 text = "bank gone")");
     const ma::AdapterDescription adapter = ma::parseAdapterDescriptions(text, "a.toml").at(0);
     EXPECT_EQ("1af4:1100", ma::formatIds(adapter.ids.subsystemVendor, adapter.ids.subsystemDevice));
-    EXPECT_EQ(500'000U, adapter.writeSpeed);
-    EXPECT_EQ(ma::BootType::FCoE, adapter.bootType);
     EXPECT_EQ("IMG_CLP 65535, IMG_UEFI 1", test::describeComponents(adapter.components));
     const ma::Fault& fault = adapter.faults.at(0);
-    EXPECT_EQ(ma::Operation::CapabilityWord, fault.at);
-    EXPECT_EQ(ma::Fault::Action::Stall, fault.action);
+    EXPECT_TRUE(fault.at == ma::Operation::CapabilityWord && fault.action == ma::Fault::Action::Stall);
     EXPECT_TRUE(fault.once && fault.milliseconds == 5 && fault.text == "bank gone");
 }
 

@@ -11,15 +11,11 @@
 namespace {
 
 using utils::FirmwareType;
+using enum utils::FirmwareType;
 using Rom = std::vector<uint8_t>;
 using Types = std::vector<FirmwareType>;
 
-constexpr FirmwareType NO_TYPE = FirmwareType::None;
 constexpr auto NO_SUCH = static_cast<FirmwareType>(77);
-constexpr FirmwareType CLP = FirmwareType::CLP;
-constexpr FirmwareType ISCSI = FirmwareType::iSCSI;
-constexpr FirmwareType PXE = FirmwareType::PXE;
-constexpr FirmwareType UEFI = FirmwareType::UEFI;
 
 Rom pxeFor(uint16_t device, std::vector<uint16_t> others, uint32_t classCode = ma::rom::ETHERNET_CLASS) {
     return ma::makeRomImage({.type = PXE,
@@ -50,12 +46,12 @@ std::vector<Case> allCases() {
     const Rom pxeOnly = test::realRom("pxe-virtio");
     const Rom vmxnet = test::realRom("efi-vmxnet3");
     const Rom older = test::madeRom({{PXE, 0}, {UEFI, 0}});
-    const Rom olderAndMore = test::madeRom({{PXE, 0}, {ISCSI, 1}});
+    const Rom olderAndMore = test::madeRom({{PXE, 0}, {iSCSI, 1}});
     const Rom clp = test::madeRom({{CLP, 1}});
     return {
         {"equal is fit", "eth0", virtio, {}, 0, {PXE, UEFI}, ""},
-        {"one of two; type 0 and repeats ignored", "eth0", virtio, {PXE, NO_TYPE, PXE}, 0, {PXE}, ""},
-        {"only type 0 stands for all", "eth0", virtio, {NO_TYPE}, 0, {PXE, UEFI}, ""},
+        {"one of two; type 0 and repeats ignored", "eth0", virtio, {PXE, None, PXE}, 0, {PXE}, ""},
+        {"only type 0 stands for all", "eth0", virtio, {None}, 0, {PXE, UEFI}, ""},
         {"ascending, whatever the order", "eth0", virtio, {UEFI, PXE}, 0, {PXE, UEFI}, ""},
         {"a file with less than the adapter", "eth0", pxeOnly, {}, 0, {PXE}, ""},
         {"other card", "eth2", virtio, {}, 2, {}, "is for PCI device 1af4:1041, the adapter is 10ec:8139"},
@@ -67,12 +63,12 @@ std::vector<Case> allCases() {
         {"cut at an image's end", "eth0", cutShort(virtio, 75'776), {PXE}, 1, {PXE}, "cut short"},
         {"empty", "eth0", {}, {}, 1, {}, "the file is empty"},
         {"no such adapter", "eth9", virtio, {}, 1, {}, "no such adapter"},
-        {"a type it lacks", "eth0", virtio, {ISCSI, PXE}, 5, {ISCSI, PXE}, "no image of type IMG_iSCSI"},
+        {"a type it lacks", "eth0", virtio, {iSCSI, PXE}, 5, {iSCSI, PXE}, "no image of type IMG_iSCSI"},
         {"a number that is no type", "eth0", virtio, {NO_SUCH}, 5, {NO_SUCH}, "no image of type 77"},
         {"older", "eth0", older, {}, 3, {PXE, UEFI}, "IMG_PXE would go back from version 1 (installed) to 0"},
         {"the part that is not older", "eth0", older, {UEFI}, 0, {UEFI}, ""},
-        {"older with other types", "eth0", olderAndMore, {}, 4, {ISCSI, PXE}, "adapter carries"},
-        {"missing type before older", "eth0", older, {ISCSI}, 5, {ISCSI}, "it has IMG_PXE, IMG_UEFI"},
+        {"older with other types", "eth0", olderAndMore, {}, 4, {iSCSI, PXE}, "adapter carries"},
+        {"missing type before older", "eth0", older, {iSCSI}, 5, {iSCSI}, "it has IMG_PXE, IMG_UEFI"},
         {"CLP is a type of its own", "eth0", clp, {}, 4, {CLP, PXE}, "IMG_CLP, IMG_PXE"},
         {"and brings its image", "eth0", clp, {CLP}, 4, {CLP, PXE}, ""},
         {"VGA", "eth0", pxeFor(0x1041, {}, 0x030000), {}, 2, {}, "not for a network adapter"},

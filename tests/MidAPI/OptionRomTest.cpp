@@ -13,6 +13,7 @@
 namespace {
 
 using utils::FirmwareType;
+using enum utils::FirmwareType;
 using Rom = std::vector<uint8_t>;
 
 void mend(Rom& image) {
@@ -21,11 +22,7 @@ void mend(Rom& image) {
 }
 
 TEST(OptionRom, readsRealImages) {
-    const std::pair<const char*, const char*> table[] = {{"efi-virtio", "1af4:1041"},
-                                                         {"efi-rtl8139", "10ec:8139"},
-                                                         {"efi-pcnet", "1022:2000"},
-                                                         {"efi-vmxnet3", "15ad:07b0"}};
-    for (const auto& [file, ids] : table) {
+    for (const auto& [file, ids] : {std::pair("efi-virtio", "1af4:1041"), {"efi-pcnet", "1022:2000"}}) {
         const ma::RomFile rom = ma::parseOptionRom(test::realRom(file));
         ASSERT_FALSE(rom.error) << file << ": " << *rom.error;
         for (const ma::RomImage& image : rom.images) {
@@ -40,20 +37,16 @@ TEST(OptionRom, readsRealImages) {
 }
 
 TEST(OptionRom, tellsTypesByCodeProductAndClpEntry) {
-    const std::pair<FirmwareType, const char*> table[] = {{FirmwareType::PXE, "IMG_PXE 7"},
-                                                          {FirmwareType::iSCSI, "IMG_iSCSI 7"},
-                                                          {FirmwareType::FCoE, "IMG_FCoE 7"},
-                                                          {FirmwareType::UEFI, "IMG_UEFI 7"},
-                                                          {FirmwareType::CLP, "IMG_CLP 7, IMG_PXE 7"}};
-    for (const auto& [type, expected] : table)
-        EXPECT_EQ(expected, test::describeRom(test::madeRom({{type, 7}})));
+    EXPECT_EQ("IMG_CLP 7, IMG_PXE 7", test::describeRom(test::madeRom({{CLP, 7}})));
+    EXPECT_EQ("IMG_iSCSI 2, IMG_UEFI 3, IMG_FCoE 1",
+              test::describeRom(test::madeRom({{FCoE, 1}, {iSCSI, 2}, {UEFI, 3}})));
     EXPECT_EQ("", ma::firmwareTypeName(static_cast<FirmwareType>(-1)));
     EXPECT_EQ(FirmwareType::FCoE, ma::firmwareTypeFromName("IMG_FCoE"));
     EXPECT_FALSE(ma::firmwareTypeFromName(""));
 }
 
 TEST(OptionRom, findsTheProductNameInAChainOfHeaders) {
-    Rom rom = test::madeRom({{FirmwareType::PXE, 1}});
+    Rom rom = test::madeRom({{PXE, 1}});
     constexpr std::size_t FIRST = 0x40;
     constexpr std::size_t SECOND = 0x180;
     std::copy_n(rom.begin() + FIRST, ma::rom::PNP_LENGTH, rom.begin() + SECOND);
@@ -107,7 +100,7 @@ TEST(OptionRom, namesWhatIsBroken) {
          }},
     };
     for (const Broken& broken : table) {
-        Rom rom = test::madeRom({{FirmwareType::PXE, 1}});
+        Rom rom = test::madeRom({{PXE, 1}});
         broken.damage(rom);
         const ma::RomFile parsed = ma::parseOptionRom(rom);
         ASSERT_TRUE(parsed.error) << broken.error;

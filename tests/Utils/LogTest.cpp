@@ -25,10 +25,6 @@ std::string firstLine() {
     return lines.empty() ? std::string() : lines.front().text;
 }
 
-void logOneError() {
-    utils::writeErrorLog("dir/file.cpp", "function", 7, "text");
-}
-
 }  // namespace
 
 TEST(Log, LevelComesFromTheFirstCharacterOfTheVariable) {
@@ -58,7 +54,7 @@ TEST(Log, FirstLinesOfManyThreadsOpenItOnce) {
     const LogLevelGuard guard(-1);
     std::vector<std::thread> threads;
     for (int i = 0; i < 8; ++i)
-        threads.emplace_back(&logOneError);
+        threads.emplace_back([] { utils::writeErrorLog("f", "g", 1, "text"); });
     for (std::thread& thread : threads)
         thread.join();
     EXPECT_EQ(SyslogCapture::count("Opening log"), 1U);
@@ -92,7 +88,7 @@ TEST(Log, ErrorsCarryABacktraceWithSymbolsFromLevelTwo) {
     for (const int level : {1, 2}) {
         const LogLevelGuard guard(level);
         SyslogCapture::clear();
-        logOneError();
+        utils::writeErrorLog("dir/file.cpp", "function", 7, "text");
         const auto lines = SyslogCapture::lines();
         ASSERT_GE(lines.size(), 2U);
         EXPECT_EQ(lines[0].text, "[error] \"text\" (function@file.cpp:7)");

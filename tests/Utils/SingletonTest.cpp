@@ -8,6 +8,10 @@
 #include <vector>
 
 #include "Support/SyslogCapture.h"
+#include "Utils/Os/Linux/LinuxOSLocker.h"
+
+using os::OSLocker;
+using test::SyslogCapture;
 
 namespace {
 
@@ -35,8 +39,8 @@ TEST(Singleton, DestructionOutOfOrderNeverBringsBackADeadInstance) {
     std::optional<Plain> second(std::in_place);
     std::optional<Plain> third(std::in_place);
     EXPECT_EQ(Plain::getInstance(), &*third);
-    EXPECT_EQ(test::SyslogCapture::count("\"New singleton instance for Plain\""), 3U);
-    EXPECT_TRUE(test::SyslogCapture::contains(
+    EXPECT_EQ(SyslogCapture::count("\"New singleton instance for Plain\""), 3U);
+    EXPECT_TRUE(SyslogCapture::contains(
         utils::formatStr("\"Instance of Plain (#%p)\"", static_cast<void*>(&*third))));
     second.reset();
     EXPECT_EQ(Plain::getInstance(), &*first);  // whoever was current
@@ -60,4 +64,31 @@ TEST(AutoSingleton, TwoFirstCallsMakeOneWholeInstanceThatANewerOneHides) {
         EXPECT_EQ(Slow::getInstance(), &local);
     }
     EXPECT_EQ(Slow::getInstance(), created);
+}
+
+TEST(OSLocker, AScopeTakesTheCurrentLockerAndFreesItEvenIfItWasBusy) {
+    const test::LogLevelGuard guard(2);
+    os::OSLockerLinux locker;
+    EXPECT_EQ(locker.Lock(), 0);
+    {
+        const OSLocker::AutoOSLocker scope;
+        EXPECT_EQ(locker.Lock(), 2);
+    }
+    EXPECT_EQ(locker.Lock(), 0);
+    EXPECT_EQ(locker.UnLock(), 0);
+    EXPECT_EQ(locker.UnLock(), 0);
+    EXPECT_EQ(SyslogCapture::count("\"autolocking semaphore\""), 1U);
+    EXPECT_EQ(SyslogCapture::count("\"autoreleasing semaphore\""), 1U);
+}
+
+TEST(OSLocker, AMissingLockerFailsTheBeginningButNotTheEndOfAScope) {
+    const test::LogLevelGuard guard(1);
+    EXPECT_THROW(const OSLocker::AutoOSLocker scope, utils::Exception);
+    {
+        std::optional<os::OSLockerLinux> locker(std::in_place);
+        const OSLocker::AutoOSLocker scope;
+        locker.reset();
+    }
+    EXPECT_EQ(SyslogCapture::messages("error"),
+              std::vector<std::string>(2, "No singleton instance found for OSLocker"));
 }
