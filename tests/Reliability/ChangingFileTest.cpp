@@ -111,15 +111,21 @@ TEST_F(ChangingFileTest, WhatWasReadAndVerifiedIsWrittenWholeOrNothingIs) {
 
 TEST_F(ChangingFileTest, OddPathsAreRefusedOrReadLikeAnyOther) {
     const std::string huge = m_folder.write("huge", std::string_view("x"));
-    fs::resize_file(huge, 5ULL << 30);
+    const std::string larger = m_folder.write("larger", std::string_view("x"));
+    fs::resize_file(huge, 1ULL << 31);
+    fs::resize_file(larger, 5ULL << 30);
+    mkfifo((m_folder / "fifo").c_str(), 0600);
     const std::string good = goodImage();
     for (const std::string& uri : {
              std::string("file:///proc/self/maps"),  // says that it is empty
              std::string("file:///proc/kcore"),
              std::string("file:///proc/self/mem"),
              std::string("file:///dev/null"),
+             std::string("file:///dev/zero"),
              std::string("file:///dev/tty"),
              "file://" + huge,
+             "file://" + larger,
+             "file://" + (m_folder / "fifo"),
              "file:///" + std::string(5000, 'x'),
              "file:///" + std::string(2500, '/') + std::string(2500, '.'),
              good + std::string("\0.bak", 5),

@@ -85,28 +85,13 @@ std::vector<std::string> wordsOf(const SchemaRow& row) {
 }
 
 /// A property as a word of the table.
-std::string wordOf(const std::string& name, core::CimType type, bool isArray, bool isKey,
-                   const std::string& referenceClass) {
-    std::string kind(core::typeName(type));
-    kind[0] = static_cast<char>(std::toupper(kind[0]));
-    if (type == core::CimType::Reference) kind = ">" + referenceClass;
-    return name + ":" + kind + (isArray ? "_arr" : "") + (isKey ? "*" : "");
-}
-
 std::string wordOf(core::CimProperty& property) {
-    const char* const referenceClass = property.getReferenceClass();
-    return wordOf(property.getName(), property.getType(), property.isArray(), property.isKey(),
-                  referenceClass == nullptr ? "" : referenceClass);
-}
-
-/// What a class declares, as words of the table.
-std::vector<std::string> declaredBy(const core::CimClassInfo& info) {
-    std::vector<std::string> words;
-    for (const core::PropertyDeclaration& property : core::declarationsOf(info).front()->properties) {
-        words.push_back(
-            wordOf(property.name, property.type, property.isArray, property.isKey, property.referenceClass));
-    }
-    return words;
+    std::string kind(core::typeName(property.getType()));
+    kind[0] = static_cast<char>(std::toupper(kind[0]));
+    if (property.getType() == core::CimType::Reference)
+        kind = std::string(">") + property.getReferenceClass();
+    return property.getName() + (":" + kind) + (property.isArray() ? "_arr" : "") +
+           (property.isKey() ? "*" : "");
 }
 
 TEST(Schema, HasTheClassesOfTheTableWithTheirMembersInOrder) {
@@ -124,12 +109,12 @@ TEST(Schema, HasTheClassesOfTheTableWithTheirMembersInOrder) {
         const auto& all = instance->getAllProperties();
         const std::size_t inherited =
             info.superclass == nullptr ? 0 : info.superclass->makeSample()->getAllProperties().size();
-        const std::vector<std::string> declared = declaredBy(info);
+        const auto& declared = core::declarationsOf(info).front()->properties;
         std::size_t next = 0;
         std::vector<std::string> own;
         for (std::size_t i = inherited; i < all.size(); i++) {
             const std::string word = wordOf(*all[i]);
-            const bool isDeclared = next < declared.size() && declared[next] == word;
+            const bool isDeclared = next < declared.size() && declared[next].name == all[i]->getName();
             next += isDeclared ? 1 : 0;
             own.push_back((isDeclared ? "+" : "") + word);
             EXPECT_TRUE(all[i]->IsNull()) << word;

@@ -26,7 +26,6 @@ class HookedBackend : public ma::Backend {
     // Set before the backend is used, or while nothing uses it.
     std::function<void(const std::string& operation, const std::string& adapter)> hook;
     std::optional<int> prepareStatus;
-    std::optional<Answer> writeAnswer;
     std::optional<Answer> capabilityAnswer;
 
     /// Has every call of the operation wait from now on, until letGo().
@@ -69,14 +68,16 @@ class HookedBackend : public ma::Backend {
     bool writeFlashImage(const std::string& adapter, const uint8_t* image, uint32_t imageSize,
                          uint32_t& errorCode, std::string& errorText) override {
         call("writeFlashImage", adapter);
-        if (writeAnswer) return give(*writeAnswer, errorCode, errorText);
         return m_next->writeFlashImage(adapter, image, imageSize, errorCode, errorText);
     }
     bool updateCapabilityWord(const std::string& adapter, const std::vector<utils::FirmwareType>& types,
                               uint32_t& errorCode, std::string& errorText) override {
         call("updateCapabilityWord", adapter);
-        if (capabilityAnswer) return give(*capabilityAnswer, errorCode, errorText);
-        return m_next->updateCapabilityWord(adapter, types, errorCode, errorText);
+        const bool isDone = m_next->updateCapabilityWord(adapter, types, errorCode, errorText);
+        if (!capabilityAnswer) return isDone;
+        errorCode = capabilityAnswer->code;
+        errorText = capabilityAnswer->text;
+        return capabilityAnswer->succeeds;
     }
     uint16_t getFlashImageUpdateProgress(const std::string& adapter) override {
         call("getFlashImageUpdateProgress", adapter);
@@ -94,11 +95,6 @@ class HookedBackend : public ma::Backend {
   private:
     void call(const char* operation, const std::string& adapter) const {
         if (hook) hook(operation, adapter);
-    }
-    static bool give(const Answer& answer, uint32_t& errorCode, std::string& errorText) {
-        errorCode = answer.code;
-        errorText = answer.text;
-        return answer.succeeds;
     }
 
     std::shared_ptr<ma::Backend> m_next;

@@ -57,9 +57,7 @@ core::InstanceValue UpdateClient::waitForEnd(const core::CimPath& job) const {
 }
 
 bool UpdateClient::hasEnded(const core::InstanceValue& job) {
-    constexpr unsigned completed = 7;
-    constexpr unsigned exception = 10;
-    return state(job) == completed || state(job) == exception;
+    return state(job) == 7U || state(job) == 10U;  // completed, or exception
 }
 
 unsigned UpdateClient::number(const core::InstanceValue& instance, const char* property) {
