@@ -9,16 +9,14 @@
 #include <thread>
 
 #include "Support/TestRoms.h"
+#include "System/HeldFlash.h"
 #include "System/RunningDaemon.h"
 
 namespace {
 
+using test::contains;
 using test::ProgramResult;
 using test::RunningDaemon;
-
-bool contains(const std::string& text, const std::string& part) {
-    return text.find(part) != std::string::npos;
-}
 
 /// Starts the update of eth0 to a real image and returns the job's path.
 std::string startUpdate(const RunningDaemon& daemon) {
@@ -141,6 +139,19 @@ TEST(DaemonTest, IsDiscoveredFromTheInteropNamespace) {
         ASSERT_EQ(referenced.size(), 1U);
         EXPECT_TRUE(contains(referenced[0], "Quenx:EthernetPort"));
     }
+    // Each end of an association stands in its own namespace, and each path can be asked for.
+    for (const std::string& path : daemon.lines("ein", "CIM_ElementConformsToProfile")) {
+        const std::string link = daemon.lines("gi", path).at(0);
+        EXPECT_TRUE(contains(link, "ConformantStandard=root/interop:Quenx_RegisteredProfile")) << link;
+        EXPECT_TRUE(contains(link, "ManagedElement=root/cimv2:Quenx_")) << link;
+    }
+    const std::string manager = daemon.lines("ein", "CIM_Service").at(0);
+    EXPECT_TRUE(contains(daemon.wbemcli("di", manager).error, "(7) CIM_ERR_NOT_SUPPORTED"));
+    // What is served elsewhere is not shown here.
+    EXPECT_TRUE(contains(daemon.wbemcli("ei", "Quenx_EthernetPort").error, "(5) CIM_ERR_INVALID_CLASS"));
+    EXPECT_TRUE(contains(daemon.wbemcli("gc", "Quenx_EthernetPort").error, "(6) CIM_ERR_NOT_FOUND"));
+    for (const std::string& name : daemon.lines("ecn", ""))
+        EXPECT_FALSE(daemon.lines("gc", name).empty()) << name;
 }
 
 /// Stands in for the service manager.
@@ -174,14 +185,15 @@ TEST(DaemonTest, LetsAFlashEndBeforeItStops) {
     const test::TempFolder folder;
     const NotifySocket manager(folder / "notify");
     RunningDaemon daemon({}, {"NOTIFY_SOCKET=" + (folder / "notify")});
-    const std::string job = startUpdate(daemon);
-    ASSERT_TRUE(reaches(daemon, job, "4"));
+    test::HeldFlash flash(daemon.folder() / "state/eth0");
+    ASSERT_TRUE(reaches(daemon, startUpdate(daemon), "4"));
     daemon.program().send(SIGTERM);
     ASSERT_TRUE(daemon.program().waitFor("waiting for the flash of Quenx:FirmwareUpdate@Job#1 at "));
     daemon.program().send(SIGTERM);
+    EXPECT_TRUE(daemon.program().waitFor("asked again to stop"));
+    flash.release();
     const ProgramResult result = daemon.program().finish();
     EXPECT_EQ(result.status, 0) << result.out;
-    EXPECT_TRUE(contains(result.out, "asked again to stop")) << result.out;
     EXPECT_TRUE(contains(result.out, "stopped")) << result.out;
     const std::string told = manager.all();
     for (const char* part : {"READY=1", "STOPPING=1", "EXTEND_TIMEOUT_USEC=30000000", "STATUS=waiting for"}) {
@@ -254,10 +266,11 @@ TEST(DaemonTest, NamesWhatKeepsItFromServing) {
         started({"--daemon-lock-file", lock, "--listen-http-port", std::to_string(daemon.httpPort())});
     EXPECT_EQ(taken.status, 1);
     EXPECT_TRUE(contains(taken.error, "cannot listen on 127.0.0.1 port ")) << taken.error;
-    EXPECT_EQ(started({"--daemon-lock-file", lock, "--listen-http-port", "0", "--providers-directory",
-                       "/nonexistent"})
-                  .status,
-              1);
+    // The lock is free again.
+    const ProgramResult none = started(
+        {"--daemon-lock-file", lock, "--listen-http-port", "0", "--providers-directory", "/nonexistent"});
+    EXPECT_EQ(none.status, 1);
+    EXPECT_TRUE(contains(none.error, "/nonexistent")) << none.error;
 }
 
 }  // namespace

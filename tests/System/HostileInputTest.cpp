@@ -2,8 +2,9 @@
 #include <gtest/gtest.h>
 
 #include <algorithm>
-#include <atomic>
+#include <chrono>
 #include <fstream>
+#include <list>
 #include <random>
 #include <thread>
 
@@ -18,90 +19,50 @@ using test::httpRequest;
 using test::RawConnection;
 using test::statusOf;
 
-using Clock = std::chrono::steady_clock;
-
 constexpr const char* kBadAddress = "127.0.0.2";
 #ifdef QUENX_SANITIZED
-constexpr auto kPatience = 20s;
 constexpr std::size_t kMostMemory = 4000;
 #else
-constexpr auto kPatience = 5s;
 constexpr std::size_t kMostMemory = 150;  // MiB
 #endif
 
-const std::string& goodBody() {
-    static const std::string body = test::readSample("w-EnumerateInstanceNames.xml");
-    return body;
-}
-
-/// Asks all the time, each time on a new connection, and notes how long an answer takes.
-class GoodClient {
-  public:
-    explicit GoodClient(int port) : m_port(port), m_thread([this] { run(); }) {}
-    ~GoodClient() { stop(); }
-    GoodClient(const GoodClient&) = delete;
-    GoodClient& operator=(const GoodClient&) = delete;
-
-    void stop() {
-        m_stop = true;
-        if (m_thread.joinable()) m_thread.join();
-    }
-    std::size_t failures() const { return m_failures; }
-    std::size_t answers() const { return m_times.size(); }
-    std::chrono::milliseconds p99() {
-        std::sort(m_times.begin(), m_times.end());
-        return std::chrono::duration_cast<std::chrono::milliseconds>(m_times[m_times.size() * 99 / 100]);
-    }
-
-  private:
-    void run() {
-        while (!m_stop) {
-            const auto start = Clock::now();
-            const RawConnection connection(m_port, "127.0.0.1");
-            const bool sent = connection.isOpen() && connection.send(httpRequest(goodBody()));
-            if (sent && statusOf(connection.receive(kPatience)) == 200) {
-                m_times.push_back(Clock::now() - start);
-            } else {
-                ++m_failures;
-            }
-            std::this_thread::sleep_for(5ms);
-        }
-    }
-
-    const int m_port;
-    std::atomic<bool> m_stop{false};
-    std::atomic<std::size_t> m_failures{0};
-    std::vector<Clock::duration> m_times;
-    std::thread m_thread;
-};
-
+/// While a test attacks, a good client asks all the time, each time on a new connection, and is answered.
 class HostileInputTest : public ::testing::Test {
   protected:
     HostileInputTest()
-        : m_daemon({"--limits-header-seconds", "1", "--limits-request-seconds", "2", "--limits-idle-seconds",
-                    "2", "--limits-connections", "200", "--limits-connections-per-address", "100"}),
-          m_client(m_daemon.httpPort()) {}
+        : m_daemon({"--limits-header-seconds", "3", "--limits-request-seconds", "4", "--limits-idle-seconds",
+                    "3", "--limits-connections", "200", "--limits-connections-per-address", "100"}),
+          m_goodClient([this](const std::stop_token& stop) { goOnAsking(stop); }) {}
+
+    void goOnAsking(const std::stop_token& stop) {
+        do {
+            const auto start = std::chrono::steady_clock::now();
+            const RawConnection connection(m_daemon.httpPort(), "127.0.0.1");
+            connection.send(httpRequest(m_body));
+            EXPECT_EQ(statusOf(connection.receive()), 200);
+            m_times.push_back(std::chrono::steady_clock::now() - start);
+            std::this_thread::sleep_for(5ms);
+        } while (!stop.stop_requested());
+    }
 
     void TearDown() override {
-        m_client.stop();
-        EXPECT_EQ(m_client.failures(), 0U);
-        ASSERT_GT(m_client.answers(), 0U);
-        EXPECT_LT(m_client.p99(), kPatience);
-        const std::string name = ::testing::UnitTest::GetInstance()->current_test_info()->name();
-        std::cout << name << ": a good client had " << m_client.answers() << " answers, p99 "
-                  << m_client.p99().count() << " ms; the daemon took " << memory() << " MiB at most\n";
+        m_goodClient.request_stop();
+        m_goodClient.join();
+        std::sort(m_times.begin(), m_times.end());
+        const auto p99 =
+            std::chrono::duration_cast<std::chrono::milliseconds>(m_times[(m_times.size() - 1) * 99 / 100]);
+        std::cout << "a good client had " << m_times.size() << " answers, p99 " << p99.count()
+                  << " ms; the daemon took " << memory() << " MiB at most\n";
         EXPECT_LT(memory(), kMostMemory);
         EXPECT_EQ(m_daemon.stop().status, 0);
     }
 
-    RawConnection attacker(const std::string& from = kBadAddress) const {
-        return {m_daemon.httpPort(), from};
-    }
-
-    std::string answerTo(const std::string& bytes) const {
-        const RawConnection connection = attacker();
+    std::string answerTo(const std::string& bytes, bool endsThere = false,
+                         const std::string& from = kBadAddress) const {
+        const RawConnection connection(m_daemon.httpPort(), from);
         connection.send(bytes);
-        return connection.receive(kPatience);
+        if (endsThere) connection.endSending();
+        return connection.receive();
     }
 
     /// The most memory that the daemon has had, in MiB.
@@ -115,35 +76,35 @@ class HostileInputTest : public ::testing::Test {
         return kilobytes / 1024;
     }
 
+    const std::string m_body = test::readSample("w-EnumerateInstanceNames.xml");
+    const std::string m_request = httpRequest(m_body);
     test::RunningDaemon m_daemon;
-    GoodClient m_client;
+    std::vector<std::chrono::steady_clock::duration> m_times;
+    std::jthread m_goodClient;
 };
 
 TEST_F(HostileInputTest, EndsConnectionsThatComeToNothing) {
-    const std::string request = httpRequest(goodBody());
-    const std::size_t head = request.find("\r\n\r\n");
-    std::vector<RawConnection> silent;
+    const std::size_t head = m_request.find("\r\n\r\n");
+    std::list<RawConnection> silent;
     for (int i = 0; i < 50; ++i)
-        silent.push_back(attacker());
-    const RawConnection shortBody = attacker();
-    shortBody.send(request.substr(0, request.size() - 10));
-    const RawConnection noEnd = attacker();
-    noEnd.send(request.substr(0, head));
+        silent.emplace_back(m_daemon.httpPort(), kBadAddress);
+    const RawConnection shortBody(m_daemon.httpPort(), kBadAddress);
+    shortBody.send(m_request.substr(0, m_request.size() - 10));
+    const RawConnection noEnd(m_daemon.httpPort(), kBadAddress);
+    noEnd.send(m_request.substr(0, head));
 
     // A byte every tenth of a second moves all the time, and still comes to an end.
-    const RawConnection slow = attacker();
-    const auto start = Clock::now();
+    const RawConnection slow(m_daemon.httpPort(), kBadAddress);
     std::size_t sent = 0;
-    while (sent < head && slow.send(request.substr(sent, 1)) && Clock::now() - start < kPatience) {
+    while (sent < head && slow.send(m_request.substr(sent, 1))) {
         ++sent;
         std::this_thread::sleep_for(100ms);
     }
     EXPECT_LT(sent, head);
-    EXPECT_LT(Clock::now() - start, kPatience);
     for (const RawConnection& connection : silent)
-        EXPECT_TRUE(connection.isClosedWithin(kPatience));
-    EXPECT_TRUE(shortBody.isClosedWithin(kPatience));
-    EXPECT_TRUE(noEnd.isClosedWithin(kPatience));
+        EXPECT_TRUE(connection.isClosed());
+    EXPECT_TRUE(shortBody.isClosed());
+    EXPECT_TRUE(noEnd.isClosed());
 }
 
 TEST_F(HostileInputTest, RefusesWhatIsTooLarge) {
@@ -158,10 +119,10 @@ TEST_F(HostileInputTest, RefusesWhatIsTooLarge) {
     for (int i = 0; i < 10000; ++i)
         headers += "X-" + std::to_string(i) + ": y\r\n";
     EXPECT_EQ(statusOf(answerTo(headers)), 431);
-    const RawConnection longer = attacker();
-    longer.send(httpRequest(goodBody()) + "more than announced\r\n\r\n");
-    EXPECT_EQ(statusOf(longer.receive(kPatience)), 200);
-    EXPECT_TRUE(longer.isClosedWithin(kPatience));
+    const RawConnection longer(m_daemon.httpPort(), kBadAddress);
+    longer.send(m_request + "more than announced\r\n\r\n");
+    EXPECT_EQ(statusOf(longer.receive()), 200);
+    EXPECT_TRUE(longer.isClosed());
 }
 
 TEST_F(HostileInputTest, RefusesBodiesByTheirFault) {
@@ -170,7 +131,7 @@ TEST_F(HostileInputTest, RefusesBodiesByTheirFault) {
         nested += "<a>";
     const std::string bomb =
         "<!DOCTYPE l [<!ENTITY a 'aaaaaaaaaa'><!ENTITY b '&a;&a;&a;&a;&a;&a;'>]><CIM>&b;&b;&b;</CIM>";
-    std::string badText = goodBody();
+    std::string badText = m_body;
     badText.replace(badText.find("Quenx_"), 6, "Quen\xC3\x28");
     for (const std::string& body : {std::string("\0", 1), std::string(), nested, bomb, badText}) {
         const std::string answer = answerTo(httpRequest(body));
@@ -178,52 +139,59 @@ TEST_F(HostileInputTest, RefusesBodiesByTheirFault) {
         EXPECT_NE(answer.find("CIMError: request-not-well-formed"), std::string::npos) << answer;
     }
     EXPECT_NE(answerTo(httpRequest("<CIM/>")).find("CIMError: request-not-valid"), std::string::npos);
-    const auto changed = [](const std::string& from, const std::string& to) {
-        std::string request = httpRequest(goodBody());
-        return request.replace(request.find(from), from.size(), to);
+}
+
+TEST_F(HostileInputTest, JudgesTheHeadBeforeTheBody) {
+    const std::string type = "application/xml";
+    const std::string length = "Content-Length: " + std::to_string(m_body.size());
+    const struct {
+        std::string from;
+        std::string to;
+        int status;
+    } table[] = {
+        {type, "Text/XML; charset=\"UTF-8\"", 200},
+        {type, "text/xmlish", 415},
+        {type, "text/xml; charset=latin1", 415},
+        {"POST", "GET", 405},
+        {"POST", "M-POST", 501},
+        {length, "X: y", 411},
+        {length, "Transfer-Encoding: chunked", 411},
+        {length, "Content-Length: -1", 400},
+        {length, "Content-Length: 99999999999999999999", 413},
+        {"CIMOperation: MethodCall", "CIMMethod: GetClass", 400},
+        {"CIMOperation", "CIMBatch", 501},
     };
-    EXPECT_EQ(statusOf(answerTo(changed("POST", "GET"))), 405);
-    EXPECT_EQ(statusOf(answerTo(changed("POST", "M-POST"))), 501);
-    EXPECT_EQ(statusOf(answerTo(changed("application/xml", "text/plain"))), 415);
-    EXPECT_EQ(statusOf(answerTo(changed("Content-Length", "X-Length"))), 411);
-    EXPECT_EQ(statusOf(answerTo(changed("CIMOperation: MethodCall", "CIMMethod: GetClass"))), 400);
-    EXPECT_EQ(statusOf(answerTo(changed("CIMOperation", "CIMBatch"))), 501);
+    for (const auto& row : table) {
+        std::string request = m_request;
+        request.replace(request.find(row.from), row.from.size(), row.to);
+        EXPECT_EQ(statusOf(answerTo(request)), row.status) << row.to;
+    }
 }
 
 TEST_F(HostileInputTest, SurvivesPrefixesAndFlippedBits) {
-    const std::string request = httpRequest(goodBody());
-    const std::size_t end = request.find("</CIM>") + 6;
-    for (std::size_t length = 0; length < end; ++length) {
-        const RawConnection connection = attacker();
-        connection.send(std::string_view(request).substr(0, length));
-        connection.endSending();
-        EXPECT_NE(statusOf(connection.receive(kPatience)), 200) << length;
-    }
+    const std::size_t end = m_request.find("</CIM>") + 6;
+    for (std::size_t length = 0; length < end; ++length)
+        EXPECT_NE(statusOf(answerTo(m_request.substr(0, length), true)), 200) << length;
     std::mt19937 random(3);
     for (int round = 0; round < 1000; ++round) {
-        std::string flipped = request;
-        flipped[request.find("\r\n\r\n") + random() % goodBody().size()] ^=
+        std::string flipped = m_request;
+        flipped[m_request.find("\r\n\r\n") + random() % m_body.size()] ^=
             static_cast<char>(1U << random() % 8);
-        const RawConnection connection = attacker();
-        connection.send(flipped);
-        connection.endSending();
-        connection.receive(kPatience);
+        answerTo(flipped, true);
     }
 }
 
 TEST_F(HostileInputTest, TakesOddCredentialsForWrongOnes) {
-    const std::string body = goodBody();
     for (int byte = 0; byte < 256; byte += 3) {
-        std::string user = "ad";
-        user += static_cast<char>(byte);
+        const std::string user = std::string("ad") + static_cast<char>(byte) + ":\xFF";
         // Each from an address of its own: an address that fails has to wait.
-        const RawConnection connection = attacker("127.1.0." + std::to_string(byte));
-        connection.send(httpRequest(body, user + ":\xFF" + user));
-        EXPECT_EQ(statusOf(connection.receive(kPatience)), 401) << byte;
+        const std::string answer =
+            answerTo(httpRequest(m_body, user), false, "127.1.0." + std::to_string(byte));
+        EXPECT_EQ(statusOf(answer), 401) << byte;
     }
     for (const char* header :
          {"Basic", "Basic !!!!", "Bearer x", "Digest username=\"admin\"", "Basic YQ=="}) {
-        std::string request = httpRequest(body, "");
+        std::string request = httpRequest(m_body, "");
         request.insert(request.find("Content-Type"), std::string("Authorization: ") + header + "\r\n");
         const std::string answer = answerTo(request);
         EXPECT_EQ(statusOf(answer), 401) << header;
@@ -240,23 +208,23 @@ TEST_F(HostileInputTest, SurvivesGarbageInPlaceOfTls) {
         // Some begin as a handshake does.
         if (round % 2 == 0) garbage = "\x16\x03\x01" + garbage;
         const RawConnection connection(m_daemon.httpsPort(), kBadAddress);
-        connection.send(round % 10 == 0 ? httpRequest(goodBody()) : garbage);
+        connection.send(round % 10 == 0 ? m_request : garbage);
         connection.endSending();
-        EXPECT_TRUE(connection.isClosedWithin(kPatience)) << round;
+        EXPECT_TRUE(connection.isClosed()) << round;
     }
-    const RawConnection hello = attacker();
+    const RawConnection hello(m_daemon.httpPort(), kBadAddress);
     hello.send("\x16\x03\x01\x02\x01\xFC");
-    EXPECT_TRUE(hello.isClosedWithin(kPatience));
+    EXPECT_TRUE(hello.isClosed());
     EXPECT_EQ(m_daemon.wbemcli("ein", "CIM_Service", {}, true).status, 0);
 }
 
 TEST_F(HostileInputTest, SurvivesTenThousandConnections) {
     for (int round = 0; round < 50; ++round) {
-        std::vector<RawConnection> connections;
-        for (int i = 0; i < 200; ++i)
-            connections.push_back(attacker("127.0.0.3"));
-        for (std::size_t i = 0; i < connections.size(); i += 10)
-            connections[i].send("POST");
+        std::list<RawConnection> connections;
+        for (int i = 0; i < 200; ++i) {
+            connections.emplace_back(m_daemon.httpPort(), "127.0.0.3");
+            if (i % 10 == 0) connections.back().send("POST");
+        }
         std::this_thread::sleep_for(20ms);
     }
 }

@@ -17,20 +17,11 @@ namespace {
 
 constexpr int SILENCE_MS = 60'000;
 
-void applyEnvironment(const std::vector<std::string>& environment) {
-    for (const std::string& one : environment) {
-        const auto equals = one.find('=');
-        if (equals == std::string::npos) {
-            unsetenv(one.c_str());
-        } else {
-            setenv(one.substr(0, equals).c_str(), one.substr(equals + 1).c_str(), 1);
-        }
-    }
-}
-
 [[noreturn]] void become(const std::vector<std::string>& command,
                          const std::vector<std::string>& environment) {
-    applyEnvironment(environment);
+    // Without "=" it removes the name.
+    for (const std::string& one : environment)
+        putenv(const_cast<char*>(one.c_str()));
     std::vector<char*> arguments;
     for (const std::string& one : command)
         arguments.push_back(const_cast<char*>(one.c_str()));
@@ -99,7 +90,7 @@ bool Program::readSome() {
 }
 
 bool Program::waitFor(const std::string& text) {
-    while (result_.out.find(text) == std::string::npos && result_.error.find(text) == std::string::npos) {
+    while (!contains(result_.out, text) && !contains(result_.error, text)) {
         if (!readSome()) return false;
     }
     return true;
@@ -121,17 +112,17 @@ void Program::closeOutput() {
 ProgramResult Program::finish() {
     while (readSome()) {
     }
-    stop();
-    return result_;
-}
-
-void Program::stop() {
     // Still open: the program hangs.
     if (out_ >= 0 || error_ >= 0) kill(child_, SIGKILL);
     int status = 0;
     waitpid(child_, &status, 0);
     child_ = -1;
     result_.status = WIFEXITED(status) ? WEXITSTATUS(status) : -WTERMSIG(status);
+    return result_;
+}
+
+bool contains(const std::string& text, const std::string& part) {
+    return text.find(part) != std::string::npos;
 }
 
 ProgramResult run(const std::vector<std::string>& command, const std::vector<std::string>& environment) {

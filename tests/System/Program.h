@@ -43,13 +43,14 @@ class Program {
 
   private:
     bool readSome();
-    void stop();
 
     pid_t child_ = -1;
     int out_ = -1;
     int error_ = -1;
     ProgramResult result_;
 };
+
+bool contains(const std::string& text, const std::string& part);
 
 /// Runs to the end, with pipes.
 ProgramResult run(const std::vector<std::string>& command, const std::vector<std::string>& environment = {});

@@ -16,14 +16,13 @@ std::string adapter(const std::string& name, const std::string& pci, const std::
 
 }  // namespace
 
-void Quenxctl::describeAdapters(unsigned writeSpeed) {
-    const std::string speed = "write_speed = " + std::to_string(writeSpeed);
+void Quenxctl::describeAdapters(const std::string& more) {
     const std::string both = R"({ type = "IMG_PXE", revision = 0 }, { type = "IMG_UEFI", revision = 0 })";
     const std::string flash = "flash_file = \"" + image_ + "\"\n";
     folder_.write(
         "adapters.toml",
-        adapter("eth0", "0000:03:00.0", "1af4:1041", both, flash + speed) +
-            adapter("eth1", "0000:03:00.1", "1af4:1041", both, flash + speed) +
+        adapter("eth0", "0000:03:00.0", "1af4:1041", both, flash + more) +
+            adapter("eth1", "0000:03:00.1", "1af4:1041", both, flash) +
             adapter("eth3", "0000:05:00.0", "1af4:1041", both, "updatable = false") +
             adapter("eth4", "0000:06:00.0", "1af4:1041", R"({ type = "IMG_iSCSI", revision = 1 })", ""));
 }
@@ -37,6 +36,13 @@ std::vector<std::string> Quenxctl::command(const std::vector<std::string>& argum
 ProgramResult Quenxctl::quenxctl(const std::vector<std::string>& arguments,
                                  const std::vector<std::string>& environment) const {
     return run(command(arguments), environment);
+}
+
+void Quenxctl::expectError(const std::vector<std::string>& arguments, int status,
+                           const std::string& part) const {
+    const ProgramResult result = quenxctl(arguments);
+    EXPECT_EQ(result.status, status) << part << "\n" << result.out << result.error;
+    EXPECT_TRUE(contains(result.error, part)) << result.error << "\nwanted: " << part;
 }
 
 std::string Quenxctl::offerFirmware() {

@@ -15,14 +15,15 @@ namespace test {
 /// the real image "efi-virtio" is newer; eth3 cannot be updated; eth4 carries iSCSI.
 class Quenxctl : public ::testing::Test {
   protected:
-    Quenxctl() { describeAdapters(0); }
+    Quenxctl() { describeAdapters(); }
 
-    /// Writes the description; the adapters keep what they have.
-    /// @param writeSpeed  bytes a second; 0 for as fast as it goes
-    void describeAdapters(unsigned writeSpeed);
+    /// Writes the description, with further lines on eth0; the adapters keep what they have.
+    void describeAdapters(const std::string& more = "");
     std::vector<std::string> command(const std::vector<std::string>& arguments) const;
     ProgramResult quenxctl(const std::vector<std::string>& arguments,
                            const std::vector<std::string>& environment = {}) const;
+    /// Runs it, and expects this exit status and this in the error text.
+    void expectError(const std::vector<std::string>& arguments, int status, const std::string& part) const;
     /// "IMG_PXE 1, IMG_UEFI 0": what an adapter carries, as a new process sees it.
     std::string firmwareOf(const std::string& adapter) const;
 

@@ -2,13 +2,12 @@
 
 #include <arpa/inet.h>
 #include <netinet/in.h>
-#include <poll.h>
-#include <sys/socket.h>
-#include <unistd.h>
+#include <sys/time.h>
 
 #include <array>
+#include <cerrno>
 #include <cstdlib>
-#include <utility>
+#include <tuple>
 
 namespace test {
 
@@ -30,62 +29,6 @@ bool isWhole(const std::string& answer) {
     return answer.size() - end - 4 >= std::strtoul(answer.c_str() + length + 16, nullptr, 10);
 }
 
-}  // namespace
-
-RawConnection::RawConnection(int port, const std::string& from)
-    : m_socket(::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0)) {
-    const sockaddr_in here = addressOf(from, 0);
-    const sockaddr_in there = addressOf("127.0.0.1", port);
-    if (::bind(m_socket, reinterpret_cast<const sockaddr*>(&here), sizeof here) != 0 ||
-        ::connect(m_socket, reinterpret_cast<const sockaddr*>(&there), sizeof there) != 0) {
-        ::close(std::exchange(m_socket, -1));
-    }
-}
-
-RawConnection::~RawConnection() {
-    if (m_socket >= 0) ::close(m_socket);
-}
-
-RawConnection::RawConnection(RawConnection&& other) noexcept : m_socket(std::exchange(other.m_socket, -1)) {}
-
-bool RawConnection::send(std::string_view bytes) const {
-    while (!bytes.empty()) {
-        const ssize_t sent = ::send(m_socket, bytes.data(), bytes.size(), MSG_NOSIGNAL);
-        if (sent <= 0) return false;
-        bytes.remove_prefix(static_cast<std::size_t>(sent));
-    }
-    return true;
-}
-
-void RawConnection::endSending() const {
-    ::shutdown(m_socket, SHUT_WR);
-}
-
-std::string RawConnection::receive(std::chrono::milliseconds patience) const {
-    std::string answer;
-    std::array<char, 4096> bytes{};
-    while (!isWhole(answer)) {
-        pollfd waiting{m_socket, POLLIN, 0};
-        if (::poll(&waiting, 1, static_cast<int>(patience.count())) <= 0) break;
-        const ssize_t length = ::recv(m_socket, bytes.data(), bytes.size(), 0);
-        if (length <= 0) break;
-        answer.append(bytes.data(), static_cast<std::size_t>(length));
-    }
-    return answer;
-}
-
-bool RawConnection::isClosedWithin(std::chrono::milliseconds time) const {
-    const auto end = std::chrono::steady_clock::now() + time;
-    std::array<char, 4096> bytes{};
-    for (;;) {
-        const auto left = end - std::chrono::steady_clock::now();
-        const auto patience = std::chrono::duration_cast<std::chrono::milliseconds>(left).count();
-        pollfd waiting{m_socket, POLLIN, 0};
-        if (patience <= 0 || ::poll(&waiting, 1, static_cast<int>(patience)) <= 0) return false;
-        if (::recv(m_socket, bytes.data(), bytes.size(), 0) <= 0) return true;
-    }
-}
-
 std::string base64(const std::string& bytes) {
     constexpr char kLetters[] = "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+/";
     std::string text;
@@ -99,6 +42,47 @@ std::string base64(const std::string& bytes) {
         }
     }
     return text;
+}
+
+}  // namespace
+
+RawConnection::RawConnection(int port, const std::string& from)
+    : m_socket(::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0)) {
+    const timeval patience{60, 0};
+    ::setsockopt(m_socket, SOL_SOCKET, SO_RCVTIMEO, &patience, sizeof patience);
+    const sockaddr_in here = addressOf(from, 0);
+    const sockaddr_in there = addressOf("127.0.0.1", port);
+    // What fails here shows as soon as something is sent.
+    if (::bind(m_socket, reinterpret_cast<const sockaddr*>(&here), sizeof here) == 0)
+        std::ignore = ::connect(m_socket, reinterpret_cast<const sockaddr*>(&there), sizeof there);
+}
+
+bool RawConnection::send(std::string_view bytes) const {
+    while (!bytes.empty()) {
+        const ssize_t sent = ::send(m_socket, bytes.data(), bytes.size(), MSG_NOSIGNAL);
+        if (sent <= 0) return false;
+        bytes.remove_prefix(static_cast<std::size_t>(sent));
+    }
+    return true;
+}
+
+std::string RawConnection::receive() const {
+    std::string answer;
+    std::array<char, 4096> bytes{};
+    while (!isWhole(answer)) {
+        const ssize_t length = ::recv(m_socket, bytes.data(), bytes.size(), 0);
+        if (length <= 0) break;
+        answer.append(bytes.data(), static_cast<std::size_t>(length));
+    }
+    return answer;
+}
+
+bool RawConnection::isClosed() const {
+    std::array<char, 4096> bytes{};
+    ssize_t length = 0;
+    while ((length = ::recv(m_socket, bytes.data(), bytes.size(), 0)) > 0) {
+    }
+    return length == 0 || errno == ECONNRESET;
 }
 
 std::string httpRequest(const std::string& body, const std::string& user) {

@@ -1,32 +1,34 @@
 #pragma once
 
-#include <chrono>
+#include <sys/socket.h>
+#include <unistd.h>
+
 #include <string>
 #include <string_view>
 
 namespace test {
 
-/// A TCP connection on loopback that sends what it is told, right or wrong.
+/// A TCP connection on loopback that sends what it is told, right or wrong. Waits for a minute at most, which
+/// is longer than a busy machine takes.
 class RawConnection {
   public:
     /// @param from  the address to come from, any of 127.0.0.0/8
     RawConnection(int port, const std::string& from);
-    ~RawConnection();
-    RawConnection(RawConnection&& other) noexcept;
-    RawConnection& operator=(RawConnection&&) = delete;
+    RawConnection(const RawConnection&) = delete;
+    RawConnection& operator=(const RawConnection&) = delete;
+    ~RawConnection() { ::close(m_socket); }
 
-    bool isOpen() const { return m_socket >= 0; }
     /// False when the other side has gone.
     bool send(std::string_view bytes) const;
     /// No more will be sent.
-    void endSending() const;
-    /// What comes until the other side closes, an answer is whole, or nothing has come for so long.
-    std::string receive(std::chrono::milliseconds patience) const;
-    /// Whether the other side closes within the time; what it sends is dropped.
-    bool isClosedWithin(std::chrono::milliseconds time) const;
+    void endSending() const { ::shutdown(m_socket, SHUT_WR); }
+    /// What comes until an answer is whole or the other side closes.
+    std::string receive() const;
+    /// Waits for the other side to close; what it sends is dropped.
+    bool isClosed() const;
 
   private:
-    int m_socket;
+    const int m_socket;
 };
 
 /// "POST /cimom" with the body, as the user, whose name is the password; without credentials for none.
@@ -34,7 +36,5 @@ std::string httpRequest(const std::string& body, const std::string& user = "admi
 
 /// The number behind "HTTP/1.1 " of an answer; 0 for none.
 int statusOf(const std::string& answer);
-
-std::string base64(const std::string& bytes);
 
 }  // namespace test

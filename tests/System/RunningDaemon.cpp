@@ -10,13 +10,11 @@ namespace test {
 
 namespace {
 
-/// Slow enough to be looked at while it writes.
 constexpr const char* kAdapters = R"([[adapter]]
 name = "eth0"
 pci_address = "0000:03:00.0"
 pci_id = "1af4:1041"
 mac = "52:54:00:10:00:00"
-write_speed = 500_000
 components = [ { type = "IMG_PXE", revision = 0 }, { type = "IMG_UEFI", revision = 0 } ]
 
 [[adapter]]
@@ -34,30 +32,20 @@ RunningDaemon::RunningDaemon(const std::vector<std::string>& options,
                              const std::vector<std::string>& environment) {
     setPassword("admin");
     setPassword("guest", {"--reader"});
-    std::vector<std::string> command{QUENX_CIMD,
-                                     "--config",
-                                     m_folder.write("quenx-cimd.toml", ""),
-                                     "--listen-https-port",
-                                     "0",
-                                     "--listen-http",
-                                     "--listen-http-port",
-                                     "0",
-                                     "--tls-certificate",
-                                     m_folder / "cert.pem",
-                                     "--tls-key",
-                                     m_folder / "key.pem",
-                                     "--auth-method",
-                                     "users",
-                                     "--auth-users-file",
-                                     m_folder / "users",
-                                     "--providers-configuration",
-                                     m_folder.write("provider.conf", ""),
-                                     "--adapters-description",
-                                     m_folder.write("adapters.toml", kAdapters),
-                                     "--adapters-state",
-                                     m_folder / "state",
-                                     "--daemon-lock-file",
-                                     m_folder / "lock"};
+    m_folder.write("quenx-cimd.toml", "[listen]\nhttps_port = 0\nhttp = true\nhttp_port = 0\n");
+    m_folder.write("provider.conf", "");
+    m_folder.write("adapters.toml", kAdapters);
+    std::vector<std::string> command{QUENX_CIMD, "--auth-method", "users"};
+    const std::pair<const char*, const char*> files[] = {{"--config", "quenx-cimd.toml"},
+                                                         {"--tls-certificate", "cert.pem"},
+                                                         {"--tls-key", "key.pem"},
+                                                         {"--auth-users-file", "users"},
+                                                         {"--providers-configuration", "provider.conf"},
+                                                         {"--adapters-description", "adapters.toml"},
+                                                         {"--adapters-state", "state"},
+                                                         {"--daemon-lock-file", "lock"}};
+    for (const auto& [option, file] : files)
+        command.insert(command.end(), {option, m_folder / file});
     command.insert(command.end(), options.begin(), options.end());
     m_program = std::make_unique<Program>(command, Program::Output::Terminal, environment);
     EXPECT_TRUE(m_program->waitFor("serving http")) << "the daemon does not start: " << m_program->seen();

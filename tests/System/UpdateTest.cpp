@@ -1,28 +1,25 @@
 #include <signal.h>
 
-#include <algorithm>
-
+#include "System/HeldFlash.h"
 #include "System/Quenxctl.h"
 
 namespace {
 
+using test::contains;
+using test::HeldFlash;
 using test::Program;
 using test::ProgramResult;
 
 constexpr const char* OLD = "IMG_PXE 0, IMG_UEFI 0";
 constexpr const char* NEW = "IMG_PXE 1, IMG_UEFI 0";
-/// An update at this speed takes a second and a half.
-constexpr unsigned SLOW = 170'000;
-
-bool contains(const std::string& text, const std::string& part) {
-    return text.find(part) != std::string::npos;
-}
 
 class Update : public test::Quenxctl {
   protected:
     std::vector<std::string> install(const std::string& adapter = "eth0") const {
         return command({"install", "--target", adapter, image_});
     }
+
+    std::string flash_ = folder_ / "adapters.state/eth0";
 };
 
 TEST_F(Update, WritesTheImageAndSaysWhatChanged) {
@@ -32,17 +29,45 @@ TEST_F(Update, WritesTheImageAndSaysWhatChanged) {
     EXPECT_TRUE(result.out.ends_with("eth0 is updated.\n  IMG_PXE   0 -> 1\n  IMG_UEFI  0 -> 0\n"))
         << result.out;
     EXPECT_EQ(result.error, "");
-    EXPECT_EQ(firmwareOf("eth0"), NEW);
-    EXPECT_EQ(firmwareOf("eth1"), OLD);
+    EXPECT_TRUE(
+        quenxctl({"adapters"})
+            .out.starts_with("NAME  PCI      IDS        UPDATABLE  FIRMWARE               DESCRIPTION\n"
+                             "eth0  03:00.0  1af4:1041  yes        IMG_PXE 1, IMG_UEFI 0  \n"
+                             "eth1  03:00.1  1af4:1041  yes        IMG_PXE 0, IMG_UEFI 0  \n"
+                             "eth3  05:00.0  1af4:1041  no         "));
 
-    const ProgramResult again = test::run(install());
+    const ProgramResult again = test::run(install("03:00.0"));
     EXPECT_EQ(again.status, 3);
-    EXPECT_TRUE(again.out.starts_with("eth0 is already current: ")) << again.out;
-    EXPECT_EQ(quenxctl({"install", "--target", "eth0", image_, "--force"}).status, 0);
+    EXPECT_EQ(again.out,
+              "eth0 is already current: it has IMG_PXE 1, IMG_UEFI 0, as the image does.\n"
+              "Use --force to write it again.\n");
+}
+
+TEST_F(Update, OneTypeCanBeCurrentAndTheOtherNot) {
+    using utils::FirmwareType;
+    image_ = folder_.write("made.rom", test::madeRom({{FirmwareType::PXE, 2}, {FirmwareType::UEFI, 2}}));
+    std::vector<std::string> one = install();
+    one.insert(one.end(), {"--types", "IMG_UEFI"});
+    EXPECT_EQ(test::run(one).status, 0);
+    EXPECT_EQ(firmwareOf("eth0"), "IMG_PXE 0, IMG_UEFI 2");
+    EXPECT_EQ(test::run(one).status, 3);
+    one.back() = "IMG_PXE,IMG_UEFI";
+    EXPECT_EQ(test::run(one).status, 0);
+    EXPECT_EQ(firmwareOf("eth0"), "IMG_PXE 2, IMG_UEFI 2");
+}
+
+TEST_F(Update, AFailureOnTheAdapterIsSaidInItsWords) {
+    describeAdapters(
+        "[[adapter.fault]]\nat = \"write\"\naction = \"fail\"\ncode = 6\ntext = \"erase failed\\u001b[2J\"");
+    const ProgramResult result = test::run(install());
+    EXPECT_EQ(result.status, 1);
+    EXPECT_EQ(result.error,
+              "quenxctl: The update of eth0 failed: erase failed\\x1b[2J (error code 6, job Exception).\n"
+              "The adapter keeps the firmware that it had; mend the cause and install again.\n");
+    EXPECT_EQ(firmwareOf("eth0"), OLD);
 }
 
 TEST_F(Update, ShowsABarOnATerminalOnly) {
-    describeAdapters(SLOW);
     const struct {
         Program::Output output;
         std::vector<std::string> environment;
@@ -66,48 +91,45 @@ TEST_F(Update, ShowsABarOnATerminalOnly) {
 }
 
 TEST_F(Update, CtrlCWaitsForTheEnd) {
-    describeAdapters(SLOW);
+    HeldFlash flash(flash_);
     Program program(install(), Program::Output::Terminal, {"TERM=xterm", "NO_COLOR"});
-    ASSERT_TRUE(program.waitFor("KiB/s"));
+    ASSERT_TRUE(program.waitFor("eth0  ["));
     program.type("\x03");
-    const ProgramResult result = program.finish();
-    EXPECT_EQ(result.status, 0) << result.out;
-    EXPECT_TRUE(contains(result.out, "it goes on to its end, and this program waits for it.")) << result.out;
+    EXPECT_TRUE(program.waitFor("it goes on to its end, and this program waits for it."));
+    flash.release();
+    EXPECT_EQ(program.finish().status, 0);
     EXPECT_EQ(firmwareOf("eth0"), NEW);
 }
 
 TEST_F(Update, GoesOnWhenNobodyListensAnyMore) {
-    describeAdapters(SLOW);
+    HeldFlash flash(flash_);
     Program program(install());
     ASSERT_TRUE(program.waitFor("eth0: 0 %"));
     program.closeOutput();
+    flash.release();
     EXPECT_EQ(program.finish().status, 0);
     EXPECT_EQ(firmwareOf("eth0"), NEW);
 }
 
 TEST_F(Update, KilledHalfWayLeavesTheOldFirmwareAndANewStartWorks) {
-    describeAdapters(SLOW);
-    {
-        Program program(install());
-        ASSERT_TRUE(program.waitFor("KiB/s"));
-        program.send(SIGKILL);
-        EXPECT_EQ(program.finish().status, -SIGKILL);
-    }
-    describeAdapters(0);
+    describeAdapters("[[adapter.fault]]\nat = \"write\"\naction = \"kill\"\npercent = 50");
+    EXPECT_EQ(test::run(install()).status, -SIGKILL);
+    describeAdapters();
     EXPECT_EQ(firmwareOf("eth0"), OLD);
     EXPECT_EQ(test::run(install()).status, 0);
     EXPECT_EQ(firmwareOf("eth0"), NEW);
 }
 
 TEST_F(Update, ASecondProcessIsToldWhoHoldsTheAdapter) {
-    describeAdapters(SLOW);
+    HeldFlash flash(flash_);
     Program first(install());
-    ASSERT_TRUE(first.waitFor("KiB/s"));
+    ASSERT_TRUE(flash.isWaitedFor());
     const ProgramResult second = test::run(install());
     EXPECT_EQ(second.status, 1) << second.out;
     EXPECT_TRUE(contains(second.error, std::to_string(first.id()))) << second.error;
     EXPECT_TRUE(contains(second.error, "The update of eth0 failed: ")) << second.error;
     EXPECT_EQ(test::run(install("eth1")).status, 0) << "another port is free";
+    flash.release();
     EXPECT_EQ(first.finish().status, 0);
     EXPECT_EQ(firmwareOf("eth0"), NEW);
 }
