@@ -3,7 +3,9 @@
 #include <gtest/gtest.h>
 #include <sys/stat.h>
 
+#include <algorithm>
 #include <atomic>
+#include <ctime>
 #include <thread>
 
 #include "Host/Authentication/BasicHeader.h"
@@ -17,7 +19,6 @@ namespace {
 using namespace std::chrono_literals;
 using host::AuthenticationOutcome;
 using host::Credentials;
-using host::FailureDelays;
 using host::Identity;
 
 TEST(BasicHeaderTest, ReadsCredentials) {
@@ -26,8 +27,7 @@ TEST(BasicHeaderTest, ReadsCredentials) {
         const char* expected;
     } table[] = {
         {"Basic YWRtaW46c2VjcmV0", "admin|secret"},
-        {"basic   YWRtaW46c2VjcmV0 ", "admin|secret"},
-        {"Basic YTpiOmM=", "a|b:c"},
+        {"basic   YTpiOmM= ", "a|b:c"},
         {"Basic YTpiOmM", "a|b:c"},
         {"Basic Og==", "|"},
         {"Basic w7w6w6Q=", "\xC3\xBC|\xC3\xA4"},
@@ -78,31 +78,16 @@ TEST_F(UsersFileTest, ChecksPasswords) {
     ASSERT_TRUE(admin);
     EXPECT_TRUE(admin->isAdministrator && admin->mayRead);
     EXPECT_FALSE(users.check({"guest", "guest"}, "")->isAdministrator);
-    for (const Credentials& wrong : {Credentials{"admin", "guest"}, Credentials{"admin", ""},
-                                     Credentials{"nobody", odd}, Credentials{"", ""}}) {
+    // In processor time, which a busy machine does not change, an unknown user costs what a known one does:
+    // without a decoy it would be a thousandth.
+    const auto cost = [&](const Credentials& wrong) {
+        const std::clock_t start = std::clock();
         EXPECT_FALSE(users.check(wrong, "")) << wrong.user;
-    }
-    host::writeUsersFile(file, {});
-    EXPECT_TRUE(users.check({"guest", "guest"}, ""));  // until it is told
-    users.reload();
-    EXPECT_FALSE(users.check({"guest", "guest"}, ""));
-}
-
-TEST_F(UsersFileTest, TakesAsLongForUnknownUsers) {
-    const std::string file = m_folder / "users";
-    host::writeUsersFile(file, {{"admin", {host::hashPassword("secret"), true}}});
-    host::UsersFile users(file);
-    const auto quickest = [&](const Credentials& credentials) {
-        auto best = std::chrono::steady_clock::duration::max();
-        for (int round = 0; round < 5; ++round) {
-            const auto start = std::chrono::steady_clock::now();
-            EXPECT_FALSE(users.check(credentials, ""));
-            best = std::min(best, std::chrono::steady_clock::now() - start);
-        }
-        return best;
+        return std::clock() - start;
     };
-    // Without a decoy the unknown user would be a thousand times as quick.
-    EXPECT_GT(quickest({"unknown", "wrong"}) * 3, quickest({"admin", "wrong"}));
+    const std::clock_t known = std::max(cost({"admin", "guest"}), cost({"admin", ""}));
+    EXPECT_GT(cost({"nobody", odd}) * 10, known);
+    EXPECT_GT(cost({"", ""}) * 10, known);
 }
 
 TEST_F(UsersFileTest, SaysWhatIsWrongWithAFile) {
@@ -135,49 +120,32 @@ TEST(PamCheckerTest, KnowsWhoMayDoWhat) {
     EXPECT_FALSE(host::PamChecker({"*"}).check({"no-such-user", "secret"}, "127.0.0.1"));
 }
 
-TEST(CredentialCacheTest, RemembersForAWhile) {
-    host::CredentialCache cache(60s);
-    const Credentials admin{"admin", "secret"};
-    EXPECT_FALSE(cache.find(admin));
-    cache.remember(admin, {"admin", true, true});
-    EXPECT_TRUE(cache.find(admin)->isAdministrator);
-    EXPECT_FALSE(cache.find({"admin", "secret "}));
-    EXPECT_FALSE(cache.find({"admins", "ecret"}));
-    cache.clear();
-    EXPECT_FALSE(cache.find(admin));
-    host::CredentialCache forgetful(0s);
-    forgetful.remember(admin, {"admin", true, true});
-    EXPECT_FALSE(forgetful.find(admin));
-}
-
 TEST(FailureDelaysTest, GrowWithFailures) {
-    FailureDelays delays;
-    const auto start = FailureDelays::Clock::now();
-    const auto waitOf = [&](const std::string& address, FailureDelays::Clock::time_point now) {
+    host::FailureDelays delays;
+    auto now = std::chrono::steady_clock::now();
+    const auto waitOf = [&](const std::string& address) {
         const auto turn = delays.admit(address, now);
         return turn ? std::chrono::duration_cast<std::chrono::milliseconds>(*turn - now) : -1ms;
     };
-    EXPECT_EQ(waitOf("192.0.2.1", start), 0ms);
-    auto now = start;
+    EXPECT_EQ(waitOf("192.0.2.1"), 0ms);
     for (const auto expected : {100ms, 200ms, 400ms, 800ms, 1600ms, 3200ms, 5000ms, 5000ms}) {
         delays.failed("192.0.2.1", now);
-        EXPECT_EQ(waitOf("192.0.2.1", now), expected);
+        EXPECT_EQ(waitOf("192.0.2.1"), expected);
         now += 20s;
     }
-    EXPECT_EQ(waitOf("192.0.2.2", now), 0ms);
+    EXPECT_EQ(waitOf("192.0.2.2"), 0ms);
     // Attempts at the same time take turns, and too many of them are not waited for.
-    EXPECT_EQ(waitOf("192.0.2.1", now), 0ms);
-    EXPECT_EQ(waitOf("192.0.2.1", now), 5000ms);
-    EXPECT_EQ(waitOf("192.0.2.1", now), 10000ms);
-    EXPECT_EQ(waitOf("192.0.2.1", now), -1ms);
+    for (const auto expected : {0ms, 5000ms, 10000ms, -1ms})
+        EXPECT_EQ(waitOf("192.0.2.1"), expected);
     delays.succeeded("192.0.2.1");
-    EXPECT_EQ(waitOf("192.0.2.1", now), 0ms);
+    EXPECT_EQ(waitOf("192.0.2.1"), 0ms);
 
     delays.failed("2001:db8::1", now);
-    EXPECT_EQ(waitOf("2001:db8::2", now), 100ms);  // the same network
-    EXPECT_EQ(waitOf("2001:db8:1::1", now), 0ms);
-    delays.failed("192.0.2.9", now + 16min);
-    EXPECT_EQ(waitOf("2001:db8::1", now + 16min), 0ms);  // forgotten
+    EXPECT_EQ(waitOf("2001:db8::2"), 100ms);  // the same network
+    EXPECT_EQ(waitOf("2001:db8:1::1"), 0ms);
+    now += 16min;
+    delays.failed("192.0.2.9", now);
+    EXPECT_EQ(waitOf("2001:db8::1"), 0ms);  // forgotten
 }
 
 /// Knows one password, and counts how often it is asked.
@@ -194,49 +162,57 @@ class CountingChecker : public host::PasswordChecker {
     std::atomic<int>& m_asked;
 };
 
-constexpr const char* kRight = "Basic YWRtaW46c2VjcmV0";         // admin:secret
-constexpr const char* kWrong = "Basic YWRtaW46d3Jvbmc=";         // admin:wrong
-constexpr const char* kStranger = "Basic c3RyYW5nZXI6c2VjcmV0";  // stranger:secret
+class AuthenticationTest : public ::testing::Test {
+  protected:
+    AuthenticationOutcome outcome(const char* header, const std::string& address = "192.0.2.1") {
+        return m_authentication.authenticate(header, address).outcome;
+    }
 
-TEST(AuthenticationTest, AsksOnceForRightCredentials) {
-    std::atomic<int> asked{0};
-    host::Authentication authentication(std::make_unique<CountingChecker>(asked), 60s);
-    const auto outcome = [&](const std::optional<std::string>& header) {
-        return authentication.authenticate(header, "192.0.2.1").outcome;
-    };
-    EXPECT_EQ(outcome(std::nullopt), AuthenticationOutcome::Missing);
+    const char* const m_right = "Basic YWRtaW46c2VjcmV0";         // admin:secret
+    const char* const m_wrong = "Basic YWRtaW5zOmVjcmV0";         // admins:ecret
+    const char* const m_stranger = "Basic c3RyYW5nZXI6c2VjcmV0";  // stranger:secret
+    std::atomic<int> m_asked{0};
+    host::Authentication m_authentication{std::make_unique<CountingChecker>(m_asked), 60s};
+};
+
+TEST_F(AuthenticationTest, AsksOnceForRightCredentials) {
+    EXPECT_EQ(m_authentication.authenticate({}, "").outcome, AuthenticationOutcome::Missing);
     EXPECT_EQ(outcome("Basic !"), AuthenticationOutcome::Missing);
     for (int i = 0; i < 3; ++i)
-        EXPECT_EQ(outcome(kRight), AuthenticationOutcome::Accepted);
-    EXPECT_EQ(asked, 1);
-    EXPECT_EQ(outcome(kStranger), AuthenticationOutcome::Forbidden);
-    authentication.reload();
-    EXPECT_EQ(outcome(kRight), AuthenticationOutcome::Accepted);
-    EXPECT_EQ(asked, 3);
+        EXPECT_EQ(outcome(m_right), AuthenticationOutcome::Accepted);
+    EXPECT_EQ(m_asked, 1);
+    EXPECT_EQ(outcome(m_stranger), AuthenticationOutcome::Forbidden);
+    m_authentication.reload();
+    EXPECT_EQ(outcome(m_right), AuthenticationOutcome::Accepted);
+    EXPECT_EQ(m_asked, 3);
+    host::Authentication forgetful(std::make_unique<CountingChecker>(m_asked), 0s);
+    for (int i = 0; i < 2; ++i)
+        EXPECT_EQ(forgetful.authenticate(m_right, "").outcome, AuthenticationOutcome::Accepted);
+    EXPECT_EQ(m_asked, 5);
 }
 
-TEST(AuthenticationTest, MakesWrongCredentialsWaitAndNobodyElse) {
-    std::atomic<int> asked{0};
-    host::Authentication authentication(std::make_unique<CountingChecker>(asked), 60s);
-    const auto outcome = [&](const char* header, const char* address) {
-        return authentication.authenticate(header, address).outcome;
-    };
-    EXPECT_EQ(outcome(kRight, "192.0.2.1"), AuthenticationOutcome::Accepted);
+TEST_F(AuthenticationTest, MakesWrongCredentialsWaitAndNobodyElse) {
+    EXPECT_EQ(outcome(m_right), AuthenticationOutcome::Accepted);
     const auto start = std::chrono::steady_clock::now();
     for (int i = 0; i < 3; ++i)
-        EXPECT_EQ(outcome(kWrong, "192.0.2.1"), AuthenticationOutcome::Wrong);
+        EXPECT_EQ(outcome(m_wrong), AuthenticationOutcome::Wrong);
     EXPECT_GE(std::chrono::steady_clock::now() - start, 300ms);
 
-    // The next one has to wait for long; a stop lets go of it.
-    for (int i = 0; i < 5; ++i)
-        outcome(kWrong, "192.0.2.2");
-    std::thread waiting([&] { EXPECT_EQ(outcome(kWrong, "192.0.2.2"), AuthenticationOutcome::Busy); });
-    const auto before = std::chrono::steady_clock::now();
-    EXPECT_EQ(outcome(kRight, "192.0.2.2"), AuthenticationOutcome::Accepted);  // remembered
-    EXPECT_EQ(outcome(kStranger, "192.0.2.3"), AuthenticationOutcome::Forbidden);
-    EXPECT_LT(std::chrono::steady_clock::now() - before, 2s);
-    authentication.stop();
-    waiting.join();
+    // Attempts from the address queue up, until one would have to wait for too long.
+    std::atomic<int> refused{0};
+    std::vector<std::thread> waiting;
+    while (refused == 0) {
+        waiting.emplace_back([&] {
+            if (outcome(m_wrong) == AuthenticationOutcome::Busy) ++refused;
+        });
+    }
+    EXPECT_EQ(outcome(m_right), AuthenticationOutcome::Accepted);  // remembered
+    EXPECT_EQ(outcome(m_stranger, "192.0.2.2"), AuthenticationOutcome::Forbidden);
+    const int before = refused;
+    m_authentication.stop();
+    for (std::thread& each : waiting)
+        each.join();
+    EXPECT_GT(refused, before) << "the stop lets go of those who wait";
 }
 
 }  // namespace

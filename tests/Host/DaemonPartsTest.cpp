@@ -1,24 +1,19 @@
 #include <gtest/gtest.h>
-#include <sys/socket.h>
 #include <sys/stat.h>
-#include <sys/un.h>
 #include <unistd.h>
 
-#include <algorithm>
 #include <sstream>
 
 #include "Host/Daemon/CommandLine.h"
 #include "Host/Daemon/ConfigCheck.h"
-#include "Host/Daemon/LockFile.h"
-#include "Host/Daemon/ServiceManager.h"
 #include "Host/Daemon/SettingsField.h"
-#include "Host/Server/RequestGate.h"
 #include "Host/Server/TlsIdentity.h"
 #include "Support/TempFolder.h"
 
 namespace {
 
 using host::Settings;
+using Words = std::vector<std::string>;
 
 template <class Body>
 std::string problemOf(Body&& body) {
@@ -30,17 +25,9 @@ std::string problemOf(Body&& body) {
     return "";
 }
 
-TEST(SettingsTest, AreReadFromAFile) {
+TEST(SettingsTest, MistakesInTheFileAreNamed) {
     const test::TempFolder folder;
     Settings settings;
-    host::readSettingsFile(folder.write("good",
-                                        "[listen]\nhttps_port = 0\nhttp = true\n[auth]\n"
-                                        "readers = ['a', '@b']\nremember_seconds = 5\n"),
-                           settings);
-    EXPECT_EQ(settings.listen.httpsPort, 0);
-    EXPECT_TRUE(settings.listen.http);
-    EXPECT_EQ(settings.authentication.readers, (std::vector<std::string>{"a", "@b"}));
-    EXPECT_EQ(settings.authentication.rememberFor, std::chrono::seconds(5));
     const std::pair<const char*, const char*> table[] = {
         {"[listen]\n\nhttps_port = 65536\n",
          ":3: listen.https_port is \"65536\"; it must be a number from 0 to"},
@@ -87,60 +74,60 @@ TEST(SettingsTest, AreAllInTheFileThatIsShipped) {
     }
 }
 
+host::CommandLine read(Words arguments) {
+    arguments.insert(arguments.begin(), "quenx-cimd");
+    std::vector<const char*> pointers;
+    for (const std::string& each : arguments)
+        pointers.push_back(each.c_str());
+    return host::readCommandLine(static_cast<int>(pointers.size()), pointers.data());
+}
+
 TEST(CommandLineTest, PutsOptionsBeforeTheFile) {
     const test::TempFolder folder;
-    const std::string file =
-        folder.write("file", "[listen]\nhttp_port = 1\nhttps_port = 2\n[auth]\nreaders = ['a']\n");
-    const auto read = [](std::vector<const char*> arguments) {
-        arguments.insert(arguments.begin(), "quenx-cimd");
-        return host::readCommandLine(static_cast<int>(arguments.size()), arguments.data());
-    };
-    const auto line = read(
-        {"--config", file.c_str(), "--listen-http-port", "3", "--listen-http", "--auth-readers", "b", "c"});
+    const std::string file = folder.write(
+        "file",
+        "[listen]\nhttp_port = 1\nhttps_port = 2\n[auth]\nreaders = ['a', '@b']\nremember_seconds = 5\n");
+    const auto line = read({"--config", file, "--listen-http-port", "3", "--listen-http"});
     EXPECT_FALSE(line.exitStatus);
     EXPECT_EQ(line.settings.listen.httpPort, 3);
     EXPECT_EQ(line.settings.listen.httpsPort, 2);
     EXPECT_TRUE(line.settings.listen.http);
-    EXPECT_EQ(line.settings.authentication.readers, (std::vector<std::string>{"b", "c"}));
-    const auto passwd = read({"passwd", "ann", "--reader"});
-    ASSERT_TRUE(passwd.passwd);
-    EXPECT_EQ(passwd.passwd->usersFile, Settings().authentication.usersFile);
-    for (const std::vector<const char*>& wrong :
-         std::vector<std::vector<const char*>>{{"--unknown"},
-                                               {"--config", "/nonexistent"},
-                                               {"--limits-workers", "0"},
-                                               {"--listen-https", "false"},
-                                               {"--listen-http", "maybe"},
-                                               {"--auth-method", "ldap"},
-                                               {"--limits-body-bytes", "2000"},
-                                               {"--limits-enumeration-seconds", "601"},
-                                               {"--adapters-state", "/tmp"},
-                                               {"passwd"}}) {
-        EXPECT_EQ(read(wrong).exitStatus, 2) << wrong[0];
-    }
+    EXPECT_EQ(line.settings.authentication.readers, (Words{"a", "@b"}));
+    EXPECT_EQ(line.settings.authentication.rememberFor, std::chrono::seconds(5));
+    const auto other = read({"--config", file, "--auth-readers", "b", "c"});
+    EXPECT_EQ(other.settings.authentication.readers, (Words{"b", "c"}));
+    const std::vector<Words> mistakes{{"--unknown"},
+                                      {"--config", "/nonexistent"},
+                                      {"--limits-workers", "0"},
+                                      {"--listen-https", "false"},
+                                      {"--listen-http", "maybe"},
+                                      {"--auth-method", "ldap"},
+                                      {"--limits-body-bytes", "2000"},
+                                      {"--limits-enumeration-seconds", "601"},
+                                      {"--adapters-state", "/tmp"},
+                                      {"passwd"}};
+    for (const Words& mistake : mistakes)
+        EXPECT_EQ(read(mistake).exitStatus, 2) << mistake[0];
 }
 
 TEST(ConfigCheckTest, LooksAtEveryFile) {
     const test::TempFolder folder;
-    Settings settings;
-    settings.providers = folder.path();
-    settings.tls = {folder / "cert", folder / "key"};
-    EXPECT_EQ(host::checkConfiguration(settings), 0);
-    for (const auto& spoil :
-         std::vector<void (*)(Settings&)>{[](Settings& s) { s.providers = "/nonexistent"; },
-                                          [](Settings& s) {
-                                              s.authentication = {"users", "/nonexistent", {}, {}};
-                                          },
-                                          [](Settings& s) { s.tls.key = "/etc/passwd"; },
-                                          [](Settings& s) {
-                                              s.tls = {"/etc/passwd", "/etc/passwd"};
-                                          },
-                                          [](Settings& s) { s.providerConfiguration = "/nonexistent"; },
-                                          [](Settings& s) { s.adapters = "/nonexistent"; }}) {
-        Settings bad = settings;
-        spoil(bad);
-        EXPECT_EQ(host::checkConfiguration(bad), 2);
-    }
+    const auto check = [&](const Words& more) {
+        Words arguments{
+            "--config",     folder.write("config", ""), "--tls-certificate",    folder / "cert", "--tls-key",
+            folder / "key", "--check-config",           "--providers-directory"};
+        arguments.push_back(folder.path());
+        arguments.insert(arguments.end(), more.begin(), more.end());
+        return host::checkConfiguration(read(arguments).settings);
+    };
+    EXPECT_EQ(check({}), 0);
+    EXPECT_EQ(check({"--auth-method", "users", "--auth-users-file", "/nonexistent"}), 2);
+    EXPECT_EQ(check({"--providers-configuration", "/nonexistent"}), 2);
+    EXPECT_EQ(check({"--adapters-description", "/nonexistent", "--adapters-state", "/tmp"}), 2);
+    folder.write("key", "junk");
+    EXPECT_EQ(check({}), 2);
+    folder.write("cert", "junk");
+    EXPECT_EQ(check({}), 2);
 }
 
 TEST(TlsIdentityTest, MakesFilesOnceAndReadsThem) {
@@ -167,70 +154,6 @@ TEST(TlsIdentityTest, MakesFilesOnceAndReadsThem) {
     }
     ::unlink(key.c_str());
     EXPECT_NE(problemOf([&] { host::makeTlsFiles(certificate, key); }).find("is missing"), std::string::npos);
-}
-
-TEST(LockFileTest, IsHeldByOne) {
-    const test::TempFolder folder;
-    const std::string path = folder / "lock";
-    {
-        const host::LockFile lock(path);
-        const std::string problem = problemOf([&] { const host::LockFile second(path); });
-        EXPECT_NE(problem.find("held by process " + std::to_string(::getpid())), std::string::npos)
-            << problem;
-    }
-    EXPECT_EQ(problemOf([&] { const host::LockFile again(path); }), "");
-    EXPECT_NE(problemOf([&] { const host::LockFile wrong(folder / "no/lock"); }), "");
-}
-
-TEST(ServiceManagerTest, SpeaksItsProtocol) {
-    const test::TempFolder folder;
-    sockaddr_un address{};
-    address.sun_family = AF_UNIX;
-    const std::string path = folder / "notify";
-    path.copy(address.sun_path, sizeof address.sun_path - 1);
-    const int receiver = ::socket(AF_UNIX, SOCK_DGRAM | SOCK_CLOEXEC, 0);
-    ASSERT_EQ(::bind(receiver, reinterpret_cast<const sockaddr*>(&address), sizeof address), 0);
-    const auto next = [&] {
-        char text[256];
-        const ssize_t length = ::recv(receiver, text, sizeof text, MSG_DONTWAIT);
-        return length < 0 ? std::string() : std::string(text, static_cast<std::size_t>(length));
-    };
-    host::ServiceManager::ready("x");
-    EXPECT_EQ(next(), "");
-    ::setenv("NOTIFY_SOCKET", path.c_str(), 1);
-    host::ServiceManager::ready("up");
-    host::ServiceManager::stillStopping("flash at 5 %", 30);
-    EXPECT_EQ(next(), "READY=1\nSTATUS=up");
-    EXPECT_EQ(next(), "EXTEND_TIMEOUT_USEC=30000000\nSTATUS=flash at 5 %");
-    ::unsetenv("NOTIFY_SOCKET");
-    ::close(receiver);
-}
-
-TEST(RequestGateTest, RefusesByTheHeadAlone) {
-    host::HttpHead good;
-    good.method = "POST";
-    good.contentLength = "10";
-    good.contentType = "Application/XML; charset=\"UTF-8\"";
-    const auto status = [&](void (*change)(host::HttpHead&)) {
-        host::HttpHead head = good;
-        change(head);
-        const auto answer = host::refuseByHead(head, 100);
-        return answer ? answer->status : 200U;
-    };
-    EXPECT_EQ(status([](host::HttpHead&) {}), 200U);
-    EXPECT_EQ(status([](host::HttpHead& h) { h.contentType = "text/xml"; }), 200U);
-    EXPECT_EQ(status([](host::HttpHead& h) { h.contentType.reset(); }), 200U);
-    EXPECT_EQ(status([](host::HttpHead& h) { h.contentLength = "100"; }), 200U);
-    EXPECT_EQ(status([](host::HttpHead& h) { h.method = "GET"; }), 405U);
-    EXPECT_EQ(status([](host::HttpHead& h) { h.method = "M-POST"; }), 501U);
-    EXPECT_EQ(status([](host::HttpHead& h) { h.contentLength.reset(); }), 411U);
-    EXPECT_EQ(status([](host::HttpHead& h) { h.chunked = true; }), 411U);
-    EXPECT_EQ(status([](host::HttpHead& h) { h.contentLength = "101"; }), 413U);
-    EXPECT_EQ(status([](host::HttpHead& h) { h.contentLength = "99999999999999999999"; }), 400U);
-    EXPECT_EQ(status([](host::HttpHead& h) { h.contentLength = "-1"; }), 400U);
-    EXPECT_EQ(status([](host::HttpHead& h) { h.contentType = "text/xmlish"; }), 415U);
-    EXPECT_EQ(status([](host::HttpHead& h) { h.contentType = "text/xml; charset=latin1"; }), 415U);
-    EXPECT_EQ(status([](host::HttpHead& h) { h.cim.batch = true; }), 501U);
 }
 
 }  // namespace

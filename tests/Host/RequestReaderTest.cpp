@@ -2,8 +2,6 @@
 
 #include <gtest/gtest.h>
 
-#include <random>
-
 #include "Host/CimXml/Headers.h"
 #include "Host/CimXml/RequestWriter.h"
 #include "Host/CimXml/WireError.h"
@@ -11,53 +9,45 @@
 
 namespace {
 
-using cimxml::IntrinsicCall;
-using cimxml::MethodCall;
 using cimxml::Request;
 using cimxml::WireFault;
 
-const cimxml::ParameterValue& parameter(const IntrinsicCall& call, std::string_view name) {
-    static const cimxml::ParameterValue none;
-    for (const cimxml::Parameter& each : call.parameters) {
-        if (each.name == name) return each.value;
-    }
-    return none;
-}
-
 template <class T>
-T held(const IntrinsicCall& call, std::string_view name) {
-    const T* value = std::get_if<T>(&parameter(call, name));
-    EXPECT_NE(value, nullptr) << name;
-    return value != nullptr ? *value : T{};
+T held(const Request& request, std::string_view name) {
+    for (const cimxml::Parameter& each : std::get<cimxml::IntrinsicCall>(request.call).parameters) {
+        if (each.name == name) return std::get<T>(each.value);
+    }
+    ADD_FAILURE() << name;
+    return T{};
 }
 
 TEST(RequestReaderTest, ReadsWhatClientsSend) {
     for (const std::string& name : test::sampleNames()) {
-        const Request request = cimxml::readRequest(test::readSample(name));
+        const std::string sample = test::readSample(name);
+        const Request request = cimxml::readRequest(sample);
         EXPECT_EQ(request.messageId, name.starts_with("w-") ? "4711" : "1001");
         EXPECT_EQ(name.substr(2), request.name() + ".xml");
+        for (std::size_t length = 0; length < sample.find("</CIM>") + 6; ++length)
+            EXPECT_THROW(cimxml::readRequest(sample.substr(0, length)), cimxml::WireError) << length;
+        if (name == "w-CreateInstance.xml") continue;  // of the instance only its name is kept
+        const std::string written = cimxml::writeRequest(request);
+        EXPECT_EQ(cimxml::writeRequest(cimxml::readRequest(written)), written) << name;
     }
-    const Request read = cimxml::readRequest(test::readSample("w-GetInstance.xml"));
-    const auto& get = std::get<IntrinsicCall>(read.call);
-    EXPECT_EQ(get.namespaceName, "root/cimv2");
+    const Request get = cimxml::readRequest(test::readSample("w-GetInstance.xml"));
+    EXPECT_EQ(std::get<cimxml::IntrinsicCall>(get.call).namespaceName, "root/cimv2");
     EXPECT_EQ(held<std::string>(get, "LocalOnly"), "FALSE");
     EXPECT_EQ(held<core::CimPath>(get, "InstanceName").toString(),
               "root/cimv2:Quenx_ConcreteJob.InstanceID=\"Quenx:FirmwareUpdate@Job#1\"");
-
-    const Request walked = cimxml::readRequest(test::readSample("p-Associators.xml"));
-    const auto& associators = std::get<IntrinsicCall>(walked.call);
-    EXPECT_EQ(held<cimxml::ClassName>(associators, "AssocClass").name, "CIM_ElementCapabilities");
-    EXPECT_EQ(held<std::vector<std::string>>(associators, "PropertyList"), std::vector<std::string>{"Name"});
-
-    const Request opened = cimxml::readRequest(test::readSample("p-OpenEnumerateInstances.xml"));
-    const auto& open = std::get<IntrinsicCall>(opened.call);
-    EXPECT_EQ(open.parameters.size(), 3U);
-    EXPECT_EQ(parameter(open, "FilterQuery").index(), 0U);
+    const Request walk = cimxml::readRequest(test::readSample("p-Associators.xml"));
+    EXPECT_EQ(held<cimxml::ClassName>(walk, "AssocClass").name, "CIM_ElementCapabilities");
+    EXPECT_EQ(held<std::vector<std::string>>(walk, "PropertyList"), std::vector<std::string>{"Name"});
+    const Request open = cimxml::readRequest(test::readSample("p-OpenEnumerateInstances.xml"));
+    held<std::monostate>(open, "FilterQuery");
 }
 
 TEST(RequestReaderTest, ReadsMethodCallsWithAndWithoutTypes) {
     const Request untyped = cimxml::readRequest(test::readSample("w-InstallFromURI.xml"));
-    const auto& call = std::get<MethodCall>(untyped.call);
+    const auto& call = std::get<cimxml::MethodCall>(untyped.call);
     EXPECT_EQ(call.object.getNamespace(), "root/cimv2");
     EXPECT_FALSE(call.isClass);
     ASSERT_EQ(call.arguments.size(), 3U);
@@ -68,7 +58,7 @@ TEST(RequestReaderTest, ReadsMethodCallsWithAndWithoutTypes) {
               "//127.0.0.1/root/cimv2:Quenx_EthernetPort.DeviceID=\"eth0\"");
 
     const Request typed = cimxml::readRequest(test::readSample("p-InstallFromURI.xml"));
-    const auto& arguments = std::get<MethodCall>(typed.call).arguments;
+    const auto& arguments = std::get<cimxml::MethodCall>(typed.call).arguments;
     ASSERT_EQ(arguments.size(), 4U);
     EXPECT_EQ(arguments[2].value.type, core::CimType::Uint16);
     EXPECT_TRUE(arguments[3].value.isNull());
@@ -95,8 +85,7 @@ TEST(RequestReaderTest, KeepsTextsAsTheyAre) {
              {"<VALUE/>", ""},
              {"<VALUE>&lt;a&#x20AC;<![CDATA[<&>]]>&amp;</VALUE>", "<a\xE2\x82\xAC<&>&"},
              {"\n <VALUE>a<!-- c -->b</VALUE>\n", "ab"}}) {
-        const Request request = cimxml::readRequest(parameterWith(text));
-        EXPECT_EQ(held<std::string>(std::get<IntrinsicCall>(request.call), "P"), expected);
+        EXPECT_EQ(held<std::string>(cimxml::readRequest(parameterWith(text)), "P"), expected);
     }
 }
 
@@ -121,9 +110,6 @@ TEST(RequestReaderTest, RefusesEachFaultByItsName) {
         {"<CIM CIMVERSION='2.0' DTDVERSION='2.0'><MESSAGE ID='1' "
          "PROTOCOLVERSION='1.0'><MULTIREQ/></MESSAGE></CIM>",
          WireFault::MultipleRequests},
-        {"<CIM CIMVERSION='2.0' DTDVERSION='2.0'><MESSAGE ID='1' "
-         "PROTOCOLVERSION='1.0'><SIMPLERSP/></MESSAGE></CIM>",
-         WireFault::NotValid},
         {wrapped(""), WireFault::NotValid},
         {wrapped("<OTHERCALL/>"), WireFault::NotValid},
         {wrapped("<IMETHODCALL NAME='X'/>"), WireFault::NotValid},
@@ -145,33 +131,6 @@ TEST(RequestReaderTest, RefusesEachFaultByItsName) {
             EXPECT_STREQ(cimxml::cimErrorHeader(error.fault()), cimxml::cimErrorHeader(fault)) << message;
             EXPECT_STRNE(error.what(), "");
         }
-    }
-}
-
-TEST(RequestReaderTest, SurvivesPrefixesAndFlippedBits) {
-    std::mt19937 random(7);
-    for (const std::string& name : test::sampleNames()) {
-        const std::string good = test::readSample(name);
-        const std::size_t end = good.find("</CIM>") + 6;
-        for (std::size_t length = 0; length < end; ++length) {
-            EXPECT_THROW(cimxml::readRequest(good.substr(0, length)), cimxml::WireError) << length;
-        }
-        for (int round = 0; round < 500; ++round) {
-            std::string bad = good;
-            bad[random() % bad.size()] ^= static_cast<char>(1U << (random() % 8));
-            try {
-                cimxml::readRequest(bad);
-            } catch (const cimxml::WireError&) {
-            }
-        }
-    }
-}
-
-TEST(RequestWriterTest, WritesWhatTheReaderReads) {
-    for (const std::string& name : test::sampleNames()) {
-        if (name == "w-CreateInstance.xml") continue;  // of the instance only its name is kept
-        const std::string once = cimxml::writeRequest(cimxml::readRequest(test::readSample(name)));
-        EXPECT_EQ(cimxml::writeRequest(cimxml::readRequest(once)), once) << name;
     }
 }
 

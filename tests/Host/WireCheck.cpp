@@ -1,14 +1,12 @@
 #include "Host/WireCheck.h"
 
-#include <unistd.h>
-
 #include <algorithm>
 #include <array>
 #include <cstdio>
 #include <filesystem>
-#include <fstream>
-#include <sstream>
 #include <string_view>
+
+#include "Support/TempFolder.h"
 
 namespace test {
 
@@ -20,21 +18,15 @@ const fs::path kFolder = QUENX_TEST_HOST_DIR;
 
 /// The output of `xmllint --dtdvalid`; empty when the message is valid.
 std::string validate(const std::string& message) {
-    char name[] = "/tmp/quenx-message-XXXXXX";
-    const int fd = ::mkstemp(name);
-    if (fd < 0) return "no temporary file";
-    ::close(fd);
-    std::ofstream(name) << message;
-    const std::string command =
-        "xmllint --noout --dtdvalid '" + (kFolder / "cimxml.dtd").string() + "' " + name + " 2>&1; echo $?";
+    const TempFolder folder;
+    const std::string command = "xmllint --noout --dtdvalid '" + (kFolder / "cimxml.dtd").string() + "' " +
+                                folder.write("message", message) + " 2>&1; echo $?";
+    FILE* pipe = ::popen(command.c_str(), "r");
+    if (pipe == nullptr) return "no xmllint";
     std::string output;
-    if (FILE* pipe = ::popen(command.c_str(), "r")) {
-        std::array<char, 512> line{};
-        while (std::fgets(line.data(), static_cast<int>(line.size()), pipe) != nullptr)
-            output += line.data();
-        ::pclose(pipe);
-    }
-    fs::remove(name);
+    for (int byte = std::fgetc(pipe); byte != EOF; byte = std::fgetc(pipe))
+        output += static_cast<char>(byte);
+    ::pclose(pipe);
     return output == "0\n" ? "" : output;
 }
 
@@ -52,9 +44,8 @@ std::string selfClosed(std::string_view message) {
 }  // namespace
 
 std::string readSample(const std::string& name) {
-    std::ostringstream content;
-    content << std::ifstream(kFolder / "samples" / name).rdbuf();
-    return content.str();
+    const auto bytes = readTestFile(kFolder / "samples" / name);
+    return {bytes.begin(), bytes.end()};
 }
 
 std::vector<std::string> sampleNames() {

