@@ -5,7 +5,6 @@
 
 #include "Cli/ImageUri.h"
 #include "Cli/Json.h"
-#include "Cli/Mof.h"
 #include "Cli/Values.h"
 
 namespace {
@@ -24,14 +23,11 @@ TEST(ImageUri, PathsBecomeUrisAndNothingIsEncoded) {
         {"a:b.rom", "file://" + here + "/a:b.rom"},
         {"FILE:///x", "FILE:///x"},
         {"file:/x", "file:/x"},
-        {"http://host/x", "http://host/x"},
         {"://x", "file://" + here + "/://x"},
     };
     for (const auto& row : rows)
         EXPECT_EQ(cli::imageUri(row.image), row.uri);
     EXPECT_EQ(cli::localPath("FILE:///a::b"), "/a::b");
-    EXPECT_FALSE(cli::localPath("http://host/x"));
-    EXPECT_FALSE(cli::localPath("file:/x"));
 }
 
 TEST(ModelOutput, ValuesAsTextAndAsJson) {
@@ -59,33 +55,6 @@ TEST(ModelOutput, BytesThatAreNoTextDoNotSpoilTheDocument) {
     std::ostringstream out;
     cli::printJson(out, {{"name", "a\xff"}});
     EXPECT_EQ(nlohmann::json::parse(out.str())["name"], "a\xEF\xBF\xBD");
-}
-
-TEST(Mof, SuperclassesComeFirst) {
-    core::ClassDeclaration root{"CIM_Dependency", "", true, {}, {}};
-    root.properties = {{"Antecedent", CimType::Reference, false, true, "CIM_ManagedElement"}};
-    core::ClassDeclaration leaf{"A_Leaf", "CIM_Dependency", true, {}, {}};
-    leaf.properties = {{"Values", CimType::Uint16, true, false, ""}};
-    leaf.methods = {{"Run",
-                     CimType::Uint32,
-                     {{"Job", CimType::Reference, false, core::CimDirection::Out, false, "X"},
-                      {"In", CimType::String, false, core::CimDirection::In, false, ""}}}};
-    EXPECT_EQ(cli::mofText({leaf, root}),
-              "[ Association,\n"
-              "   Description ( \"One element depends on another.\" ) ]\n"
-              "class CIM_Dependency {\n"
-              "    [ Key ]\n"
-              "    CIM_ManagedElement REF Antecedent;\n"
-              "};\n\n"
-              "[ Association ]\n"
-              "class A_Leaf : CIM_Dependency {\n"
-              "    uint16 Values[];\n"
-              "    uint32 Run(\n"
-              "        [ In ( false ), Out ]\n"
-              "        X REF Job,\n"
-              "        [ In ]\n"
-              "        string In);\n"
-              "};\n");
 }
 
 }  // namespace

@@ -223,17 +223,6 @@ TEST_F(DispatcherTest, CallsMethods) {
     EXPECT_EQ(statusIn(invoke(a, "Work", {text, withNull})), 4);
 }
 
-TEST_F(DispatcherTest, LetsReadersReadOnly) {
-    m_caller = {"reader", false, "localhost"};
-    EXPECT_EQ(status("GetInstance", {{"InstanceName", gadget("a", "1")}}), 0);
-    EXPECT_EQ(status("DeleteInstance", {{"InstanceName", gadget("a", "1")}}), 2);
-    EXPECT_EQ(status("CreateInstance", {}), 2);
-    EXPECT_EQ(statusIn(invoke(gadget("a", "1"), "Work", {})), 2);
-    m_caller.isAdministrator = true;
-    EXPECT_EQ(status("DeleteInstance", {{"InstanceName", gadget("a", "1")}}), 0);
-    EXPECT_EQ(status("GetInstance", {{"InstanceName", gadget("a", "1")}}), 6);
-}
-
 TEST_F(DispatcherTest, PullsToTheEnd) {
     const auto open = [&](const std::string& count) {
         return call("OpenEnumerateInstances",

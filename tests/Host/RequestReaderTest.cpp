@@ -2,7 +2,6 @@
 
 #include <gtest/gtest.h>
 
-#include "Host/CimXml/Headers.h"
 #include "Host/CimXml/RequestWriter.h"
 #include "Host/CimXml/WireError.h"
 #include "Host/WireCheck.h"
@@ -132,27 +131,6 @@ TEST(RequestReaderTest, RefusesEachFaultByItsName) {
             EXPECT_STRNE(error.what(), "");
         }
     }
-}
-
-TEST(HeadersTest, AreCheckedAgainstTheCall) {
-    const Request request = cimxml::readRequest(test::readSample("w-GetInstance.xml"));
-    const auto faultOf = [&](const cimxml::RequestHeaders& headers) -> std::string {
-        try {
-            cimxml::checkHeaders(headers);
-            cimxml::checkHeadersAgainst(headers, request);
-        } catch (const cimxml::WireError& error) {
-            return std::to_string(cimxml::httpStatus(error.fault())) + " " +
-                   cimxml::cimErrorHeader(error.fault());
-        }
-        return "";
-    };
-    EXPECT_EQ(faultOf({}), "");
-    EXPECT_EQ(faultOf({"methodcall", "Get%49nstance", "1.0", false}), "");
-    EXPECT_EQ(faultOf({{}, "GetClass", {}, false}), "400 header-mismatch");
-    EXPECT_EQ(faultOf({"Other", {}, {}, false}), "400 unsupported-operation");
-    EXPECT_EQ(faultOf({{}, {}, "2.0", false}), "501 unsupported-protocol-version");
-    EXPECT_EQ(faultOf({{}, {}, {}, true}), "501 multiple-requests-unsupported");
-    EXPECT_EQ(cimxml::percentDecoded("a%2Fb%3A%zz%4"), "a/b:%zz%4");
 }
 
 }  // namespace

@@ -1,30 +1,16 @@
 #include "System/Quenxctl.h"
 
-#include <filesystem>
 #include <nlohmann/json.hpp>
 
 namespace test {
 
-namespace {
-
-std::string adapter(const std::string& name, const std::string& pci, const std::string& id,
-                    const std::string& components, const std::string& more) {
-    return "[[adapter]]\nname = \"" + name + "\"\npci_address = \"" + pci + "\"\npci_id = \"" + id +
-           "\"\nmac = \"52:54:00:00:00:1" + name.back() + "\"\ncomponents = [" + components + "]\n" + more +
-           "\n";
-}
-
-}  // namespace
-
-void Quenxctl::describeAdapters(const std::string& more) {
-    const std::string both = R"({ type = "IMG_PXE", revision = 0 }, { type = "IMG_UEFI", revision = 0 })";
-    const std::string flash = "flash_file = \"" + image_ + "\"\n";
-    folder_.write(
-        "adapters.toml",
-        adapter("eth0", "0000:03:00.0", "1af4:1041", both, flash + more) +
-            adapter("eth1", "0000:03:00.1", "1af4:1041", both, flash) +
-            adapter("eth3", "0000:05:00.0", "1af4:1041", both, "updatable = false") +
-            adapter("eth4", "0000:06:00.0", "1af4:1041", R"({ type = "IMG_iSCSI", revision = 1 })", ""));
+void Quenxctl::describeAdapters(const std::string& fault) {
+    std::string description = TEST_ADAPTERS;
+    if (!fault.empty()) {
+        description.insert(description.find("[[adapter]]\nname = \"eth1\""),
+                           "[[adapter.fault]]\nat = \"write\"\n" + fault + "\n");
+    }
+    folder_.write("adapters.toml", description);
 }
 
 std::vector<std::string> Quenxctl::command(const std::vector<std::string>& arguments) const {
@@ -43,11 +29,6 @@ void Quenxctl::expectError(const std::vector<std::string>& arguments, int status
     const ProgramResult result = quenxctl(arguments);
     EXPECT_EQ(result.status, status) << part << "\n" << result.out << result.error;
     EXPECT_TRUE(contains(result.error, part)) << result.error << "\nwanted: " << part;
-}
-
-std::string Quenxctl::offerFirmware() {
-    std::filesystem::create_directory(folder_ / "firmware");
-    return folder_.write("provider.conf", "FWFilePath=" + (folder_ / "firmware") + "\n");
 }
 
 std::string Quenxctl::firmwareOf(const std::string& adapter) const {

@@ -5,20 +5,20 @@
 #include <string>
 #include <vector>
 
+#include "Support/SimulatedAdapters.h"
 #include "Support/TempFolder.h"
 #include "Support/TestRoms.h"
 #include "System/Program.h"
 
 namespace test {
 
-/// quenxctl on simulated adapters of its own: eth0 and eth1 are 1af4:1041 with IMG_PXE 0 and IMG_UEFI 0, so
-/// the real image "efi-virtio" is newer; eth3 cannot be updated; eth4 carries iSCSI.
+/// quenxctl on simulated adapters of its own, those of SimulatedAdapters.h.
 class Quenxctl : public ::testing::Test {
   protected:
     Quenxctl() { describeAdapters(); }
 
-    /// Writes the description, with further lines on eth0; the adapters keep what they have.
-    void describeAdapters(const std::string& more = "");
+    /// Writes the description, with a fault of eth0; the adapters keep what they have.
+    void describeAdapters(const std::string& fault = "");
     std::vector<std::string> command(const std::vector<std::string>& arguments) const;
     ProgramResult quenxctl(const std::vector<std::string>& arguments,
                            const std::vector<std::string>& environment = {}) const;
@@ -27,11 +27,9 @@ class Quenxctl : public ::testing::Test {
     /// "IMG_PXE 1, IMG_UEFI 0": what an adapter carries, as a new process sees it.
     std::string firmwareOf(const std::string& adapter) const;
 
-    /// A configuration that offers the images in the folder "firmware" of folder_, which it makes.
-    std::string offerFirmware();
-
     TempFolder folder_;
-    std::string image_ = realRomPath("efi-virtio");
+    /// For eth0 and eth1: a real one with IMG_PXE 2 and IMG_UEFI 2.
+    std::string image_ = folder_.write("new.rom", withRevision(realRom("efi-virtio"), 2));
 };
 
 }  // namespace test

@@ -6,27 +6,9 @@
 #include <filesystem>
 #include <sstream>
 
+#include "Support/SimulatedAdapters.h"
+
 namespace test {
-
-namespace {
-
-constexpr const char* kAdapters = R"([[adapter]]
-name = "eth0"
-pci_address = "0000:03:00.0"
-pci_id = "1af4:1041"
-mac = "52:54:00:10:00:00"
-components = [ { type = "IMG_PXE", revision = 0 }, { type = "IMG_UEFI", revision = 0 } ]
-
-[[adapter]]
-name = "eth3"
-pci_address = "0000:05:00.0"
-pci_id = "1022:2000"
-mac = "52:54:00:10:00:03"
-updatable = false
-components = [ { type = "IMG_PXE", revision = 1 } ]
-)";
-
-}  // namespace
 
 RunningDaemon::RunningDaemon(const std::vector<std::string>& options,
                              const std::vector<std::string>& environment) {
@@ -34,7 +16,7 @@ RunningDaemon::RunningDaemon(const std::vector<std::string>& options,
     setPassword("guest", {"--reader"});
     m_folder.write("quenx-cimd.toml", "[listen]\nhttps_port = 0\nhttp = true\nhttp_port = 0\n");
     m_folder.write("provider.conf", "");
-    m_folder.write("adapters.toml", kAdapters);
+    m_folder.write("adapters.toml", TEST_ADAPTERS);
     std::vector<std::string> command{QUENX_CIMD, "--auth-method", "users"};
     const std::pair<const char*, const char*> files[] = {{"--config", "quenx-cimd.toml"},
                                                          {"--tls-certificate", "cert.pem"},
@@ -49,15 +31,11 @@ RunningDaemon::RunningDaemon(const std::vector<std::string>& options,
     command.insert(command.end(), options.begin(), options.end());
     m_program = std::make_unique<Program>(command, Program::Output::Terminal, environment);
     EXPECT_TRUE(m_program->waitFor("serving http")) << "the daemon does not start: " << m_program->seen();
-    const std::string said = m_program->seen();
-    m_httpsPort = portOf("https://127.0.0.1:", said);
-    m_httpPort = portOf(" http://127.0.0.1:", said);
-}
-
-int RunningDaemon::portOf(const std::string& scheme, const std::string& line) const {
-    const std::size_t at = line.find(scheme);
-    EXPECT_NE(at, std::string::npos) << line;
-    return at == std::string::npos ? 0 : std::stoi(line.substr(at + scheme.size()));
+    const auto portBehind = [&](const std::string& scheme) {
+        return std::stoi(m_program->seen().substr(m_program->seen().find(scheme) + scheme.size()));
+    };
+    m_httpsPort = portBehind("https://127.0.0.1:");
+    m_httpPort = portBehind(" http://127.0.0.1:");
 }
 
 void RunningDaemon::setPassword(const std::string& name, const std::vector<std::string>& options) const {

@@ -5,12 +5,13 @@
 #include <vector>
 
 #include "Support/TempFolder.h"
+#include "Support/TestRoms.h"
 #include "System/Program.h"
 
 namespace test {
 
-/// A real quenx-cimd on free loopback ports, with the real providers and simulated adapters of its own. Users
-/// "admin" and "guest" (who may only read), each with its name as password.
+/// A real quenx-cimd on free loopback ports, with the real providers and the adapters of SimulatedAdapters.h
+/// as its own. Users "admin" and "guest" (who may only read), each with its name as password.
 class RunningDaemon {
   public:
     /// @param options  further ones, such as limits
@@ -20,6 +21,8 @@ class RunningDaemon {
     int httpPort() const { return m_httpPort; }
     int httpsPort() const { return m_httpsPort; }
     const TempFolder& folder() const { return m_folder; }
+    /// An image for eth0: a real one with IMG_PXE 2 and IMG_UEFI 2.
+    const std::string& image() const { return m_image; }
     Program& program() { return *m_program; }
     /// Runs quenx-cimd passwd on the daemon's users file.
     void setPassword(const std::string& user, const std::vector<std::string>& options = {}) const;
@@ -39,9 +42,8 @@ class RunningDaemon {
     std::string namespaceName = "root/cimv2";
 
   private:
-    int portOf(const std::string& scheme, const std::string& line) const;
-
     TempFolder m_folder;
+    std::string m_image = m_folder.write("new.rom", withRevision(realRom("efi-virtio"), 2));
     std::unique_ptr<Program> m_program;
     int m_httpPort = 0;
     int m_httpsPort = 0;

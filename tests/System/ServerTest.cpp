@@ -6,7 +6,6 @@
 #include <regex>
 #include <sstream>
 
-#include "Support/TestRoms.h"
 #include "System/RunningDaemon.h"
 
 namespace {
@@ -29,13 +28,13 @@ class Server : public ::testing::Test {
     }
 
     test::RunningDaemon daemon_;
-    std::string image_ = test::realRomPath("efi-virtio");
+    const std::string& image_ = daemon_.image();
 };
 
 TEST_F(Server, UpdatesAndKeepsTheJob) {
     const ProgramResult result = quenxctl({"install", "--target", "eth0", image_});
     EXPECT_EQ(result.status, 0) << result.error;
-    EXPECT_TRUE(contains(result.out, "eth0 is updated.\n  IMG_PXE   0 -> 1\n")) << result.out;
+    EXPECT_TRUE(contains(result.out, "eth0 is updated.\n  IMG_PXE   1 -> 2\n")) << result.out;
     EXPECT_EQ(quenxctl({"install", "--target", "eth0", image_}).status, 3);
     const ProgramResult refused = quenxctl({"install", "--target", "eth3", image_});
     EXPECT_EQ(refused.status, 1);
@@ -71,14 +70,15 @@ TEST_F(Server, ShowsTheSameModelAsInProcess) {
           {"identities"},
           {"mof"},
           {"instances", "CIM_ManagedElement"},
-          {"associators", port, "--result-class", "Quenx_SoftwareIdentity"}}) {
+          {"associators", port, "--result-class", "Quenx_SoftwareIdentity"},
+          {"associators", port, "--role", "Dependent", "--class", "Quenx_ElementSoftwareIdentity"}}) {
         const std::string expected = inProcess(arguments);
         EXPECT_NE(expected, "") << arguments[0];
         EXPECT_EQ(comparable(quenxctl(arguments).out), comparable(expected)) << arguments[0];
     }
-    const ProgramResult unknown = quenxctl({"instances", "No_Such"});
+    const ProgramResult unknown = quenxctl({"instances", "No_<&>\"Such"});
     EXPECT_EQ(unknown.status, 1);
-    EXPECT_TRUE(contains(unknown.error, "No_Such")) << unknown.error;
+    EXPECT_TRUE(contains(unknown.error, "No_<&>\"Such")) << unknown.error;
 }
 
 TEST_F(Server, RefusesWhomItCannotTrust) {

@@ -36,18 +36,15 @@ TEST_F(WrongUse, BadFilesAreRefusedWithTheReason) {
     expectRefusal("http://host/x.rom", "does not read images by \"http:\".");
     expectRefusal("file:/x", "is no well-formed file URI.\nWrite it as file:///directory/file");
     expectRefusal("%n%s\n.rom", "%n%s\\x0a.rom cannot be read: No such file or directory.");
-    EXPECT_EQ(firmwareOf("eth0"), "IMG_PXE 0, IMG_UEFI 0");
+    EXPECT_EQ(firmwareOf("eth0"), "IMG_PXE 1, IMG_UEFI 0");
 }
 
 TEST_F(WrongUse, WrongImagesAreRefusedWithBothSides) {
     using utils::FirmwareType;
     // Of the same versions as what is installed, too.
-    for (const std::string& foreign :
-         {test::realRomPath("efi-rtl8139"),
-          folder_.write("same.rom",
-                        test::madeRom({{FirmwareType::PXE, 0}, {FirmwareType::UEFI, 0}}, 0x10ec, 0x8139))}) {
-        expectRefusal(foreign, "The image is for 10ec:8139, and eth0 is 1af4:1041.\nGet the image for this");
-    }
+    const auto foreign = test::madeRom({{FirmwareType::PXE, 1}, {FirmwareType::UEFI, 0}}, 0x10ec, 0x8139);
+    expectRefusal(folder_.write("foreign.rom", foreign),
+                  "The image is for 10ec:8139, and eth0 is 1af4:1041.\nGet the image for this adapter's ids");
     ma::NewRomImage vga;
     vga.type = FirmwareType::PXE;
     vga.vendorId = 0x1af4;
@@ -55,13 +52,15 @@ TEST_F(WrongUse, WrongImagesAreRefusedWithBothSides) {
     vga.classCode = 0x030000;
     expectRefusal(folder_.write("vga.rom", ma::makeRomImage(vga)),
                   "holds code for another kind of device than a network adapter.");
+    const auto pxe = test::madeRom({{FirmwareType::PXE, 2}}, 0x15ad, 0x07b0);
+    expectError({"install", "--target", "eth4", folder_.write("pxe.rom", pxe)}, 1, "The image types differ.");
 
-    const std::string newer = folder_.write("v7.rom", test::withRevision(test::realRom("efi-virtio"), 7));
-    ASSERT_EQ(quenxctl({"install", "--target", "eth0", newer}).status, 0);
-    expectRefusal(image_,
-                  "Installed on eth0: IMG_PXE 7, IMG_UEFI 7; in the image: IMG_PXE 1, IMG_UEFI 0.\nUse a "
+    ASSERT_EQ(quenxctl({"install", "--target", "eth0", image_}).status, 0);
+    const std::string older = test::realRomPath("efi-virtio");
+    expectRefusal(older,
+                  "Installed on eth0: IMG_PXE 2, IMG_UEFI 2; in the image: IMG_PXE 1, IMG_UEFI 0.\nUse a "
                   "newer image, or --force");
-    EXPECT_EQ(quenxctl({"install", "--target", "eth0", image_, "--force"}).status, 0);
+    EXPECT_EQ(quenxctl({"install", "--target", "eth0", older, "--force"}).status, 0);
     EXPECT_EQ(firmwareOf("eth0"), "IMG_PXE 1, IMG_UEFI 0");
 }
 
@@ -72,8 +71,7 @@ TEST_F(WrongUse, OtherAdaptersAndNames) {
         std::string part;
     } rows[] = {
         {{"install", "--target", "eth3", image_}, 1, "The firmware of eth3 cannot be updated."},
-        {{"install", "--target", "eth4", image_}, 1, "The image types differ."},
-        {{"install", "--target", "eth7", image_}, 1, "Name one of these: eth0, eth1, eth3, eth4."},
+        {{"install", "--target", "eth7", image_}, 1, "Name one of these: eth0, eth1, eth2, eth3, eth4."},
         {{"install", "--target", "X.A=\"\\\"\\\\", image_}, 1, "There is no adapter \"X.A="},
         {{"install", "--target", "X.A=", image_}, 1, "There is no adapter \"X.A=\"."},
         {{"install", "--target", "eth0", image_, "--types", "IMG_FCoE"}, 1, "The image holds no IMG_FCoE."},
@@ -108,14 +106,14 @@ TEST_F(WrongUse, JsonIsOneDocumentAlsoForErrors) {
     } rows[] = {
         {{"adapters"}, 0, "/adapters/0/name", "eth0"},
         {{"instances", "Quenx_EthernetPort"}, 0, "/instances/0/class", "Quenx_EthernetPort"},
-        {{"instances", "Quenx_EthernetPort", "--names"}, 0, "/paths/4", nullptr},
+        {{"instances", "Quenx_EthernetPort", "--names"}, 0, "/paths/5", nullptr},
         {{"identities"}, 0, "/identities/0/file", nullptr},
         {{"instances", "No_Such"}, 1, "/exitStatus", 1},
         {{"install", "--target", "eth9", image_}, 1, "/error", "There is no adapter \"eth9\"."},
         {{"install", "--target", "eth3", image_}, 1, "/returnValue", 4097},
         {{"install", "--target", "eth0", image_}, 0, "/job/state", 7},
         {{"install", "--target", "eth0", image_}, 3, "/result", "already current"},
-        {{"install", "--target", "eth0", image_, "--force"}, 0, "/after/0/version", 1},
+        {{"install", "--target", "eth0", image_, "--force"}, 0, "/after/0/version", 2},
     };
     for (const auto& row : rows) {
         std::vector<std::string> arguments = row.arguments;
@@ -129,13 +127,8 @@ TEST_F(WrongUse, JsonIsOneDocumentAlsoForErrors) {
 }
 
 TEST_F(WrongUse, HelpDocumentsTheExitStatuses) {
-    for (const std::vector<std::string>& verb : {std::vector<std::string>{}, {"install"}, {"check"}}) {
-        std::vector<std::string> arguments = verb;
-        arguments.emplace_back("--help");
-        const ProgramResult result = quenxctl(arguments);
-        EXPECT_EQ(result.status, 0);
-        EXPECT_TRUE(test::contains(result.out, "3  already current")) << result.out;
-    }
+    EXPECT_TRUE(test::contains(quenxctl({"--help"}).out, "3  already current"));
+    EXPECT_TRUE(test::contains(quenxctl({"check", "--help"}).out, "3  already current"));
 }
 
 }  // namespace
