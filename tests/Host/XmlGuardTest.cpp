@@ -23,15 +23,9 @@ bool isAccepted(const std::string& document, const cimxml::XmlLimits& limits = {
 }
 
 TEST(XmlGuardTest, AcceptsWellFormedDocuments) {
-    for (
-        const std::string& good : {
-            "<a/>"s,
-            "\xEF\xBB\xBF<?xml version='1.0' encoding=\"UTF-8\" standalone='yes'?>\n<a/>\n<!-- end --><?p x?>"s,
-            "<a b='1' c=\"&lt;'\"><d >x &amp; &#x41; &#65; &#x10FFFF; ]] ></d ><![CDATA[<&]]></a>"s,
-            "<a>gr\xC3\xBC\xC3\x9F \xE2\x82\xAC \xF0\x9F\x98\x80\t\r\n</a>"s,
-        }) {
-        EXPECT_TRUE(isAccepted(good)) << good;
-    }
+    EXPECT_TRUE(isAccepted("\xEF\xBB\xBF<?xml version='1.0' encoding=\"UTF-8\" standalone='yes'?>\n<a/>"));
+    EXPECT_TRUE(isAccepted("<a b='1' c=\"&lt;'\"><d >x &amp; &#x41; &#x10FFFF; ]] ></d ><![CDATA[<&]]></a>"));
+    EXPECT_TRUE(isAccepted("<a>gr\xC3\xBC\xE2\x82\xAC\xF0\x9F\x98\x80\t\r\n</a>\n<!-- end --><?p x?>"));
 }
 
 TEST(XmlGuardTest, RefusesWhatIsNotWellFormed) {

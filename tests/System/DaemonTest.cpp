@@ -58,11 +58,6 @@ TEST(DaemonTest, ServesEveryClassToARealClient) {
     for (const char* operation : {"ei", "gc", "ec"}) {
         EXPECT_EQ(daemon.wbemcli(operation, "CIM_ManagedElement", {}, true).status, 0) << operation;
     }
-    // What is printed can be asked for, key by key, references included.
-    for (const char* name : {"Quenx_ElementCapabilities", "Quenx_EthernetPort", "Quenx_RegisteredProfile"}) {
-        for (const std::string& path : daemon.lines("ein", name))
-            daemon.lines("gi", path);
-    }
 }
 
 TEST(DaemonTest, CarriesAnUpdateFromItsStartToItsDeletion) {
