@@ -126,7 +126,9 @@ TEST_F(CimRequestsTest, DeletesOnlyWhatCanBeDeleted) {
     m_requests.deleteInstance(CimPath::of(m_b));
     EXPECT_EQ(join(m_requests.enumerateInstanceNames("Test_Gadget")), "ac");
     EXPECT_EQ(statusOf([&] { m_requests.deleteInstance(CimPath::of(m_b)); }), CimStatus::NotFound);
+    EXPECT_EQ(statusOf([&] { m_requests.getInstance(CimPath::of(m_b)); }), CimStatus::NotFound);
     EXPECT_EQ(statusOf([&] { m_requests.deleteInstance(link); }), CimStatus::NotSupported);
+    EXPECT_EQ(statusOf([&] { m_requests.deleteInstance(CimPath("Unknown", {})); }), CimStatus::InvalidClass);
 }
 
 TEST_F(CimRequestsTest, DeclaresWhatEachClassAdds) {
@@ -137,6 +139,8 @@ TEST_F(CimRequestsTest, DeclaresWhatEachClassAdds) {
         added += property.name + (property.isKey ? "! " : " ");
     EXPECT_EQ(added, "ID! Number! Made ");
 
+    EXPECT_EQ(m_requests.enumerateClasses("", false).size(), 2U);
+    EXPECT_EQ(m_requests.enumerateClasses("Test_Thing", false).size(), 1U);
     EXPECT_EQ(m_requests.enumerateClasses("", true).size(), 3U);
     EXPECT_EQ(statusOf([&] { m_requests.getClass("Unknown"); }), CimStatus::NotFound);
     EXPECT_EQ(statusOf([&] { m_requests.enumerateClasses("Unknown", true); }), CimStatus::InvalidClass);
