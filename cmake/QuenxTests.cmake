@@ -17,6 +17,13 @@ if(QUENX_PRECOMPILE)
     target_compile_options(quenx_precompiled_test PRIVATE -O0)
 endif()
 
+# quenx_test_settings(TARGET): what test programs and the libraries that they share are built with
+function(quenx_test_settings target)
+    # What is tested is optimised; the tests themselves need not be, and compile in half the time.
+    target_compile_options(${target} PRIVATE -O0)
+    quenx_precompile(${target} test)
+endfunction()
+
 # quenx_test(NAME SOURCES... [LINK targets...]): one test program; each of its tests is a CTest test
 function(quenx_test name)
     cmake_parse_arguments(ARG "" "" "LINK" ${ARGN})
@@ -25,8 +32,15 @@ function(quenx_test name)
     set_target_properties(${name} PROPERTIES ENABLE_EXPORTS ON)
     target_link_libraries(${name} PRIVATE quenx_settings QuenxTestSupport ${ARG_LINK})
     target_include_directories(${name} PRIVATE ${PROJECT_SOURCE_DIR}/tests)
-    # What is tested is optimised; the tests themselves need not be, and compile in half the time.
-    target_compile_options(${name} PRIVATE -O0)
-    quenx_precompile(${name} test)
+    quenx_test_settings(${name})
     gtest_discover_tests(${name} DISCOVERY_TIMEOUT 60 PROPERTIES TIMEOUT 120)
+endfunction()
+
+# quenx_replaces_allocation(TARGET): a program with an operator new of its own
+function(quenx_replaces_allocation target)
+    # Clang's thread sanitizer links an operator new into what it takes for C++, and then there are two.
+    if(QUENX_SANITIZE STREQUAL "thread" AND CMAKE_CXX_COMPILER_ID STREQUAL "Clang")
+        target_link_options(${target} PRIVATE --driver-mode=gcc)
+        target_link_libraries(${target} PRIVATE stdc++ m)
+    endif()
 endfunction()

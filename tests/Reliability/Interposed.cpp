@@ -78,10 +78,16 @@ QUENX_EXPORT void operator delete(void* memory, std::size_t) noexcept {
     operator delete(memory);
 }
 
+using Create = int(pthread_t*, const pthread_attr_t*, void* (*)(void*), void*);
+
+/// What a sanitizer, if there is one, does for pthread_create.
+extern "C" __attribute__((weak)) Create __interceptor_pthread_create;
+
 extern "C" QUENX_EXPORT int pthread_create(pthread_t* thread, const pthread_attr_t* attributes,
                                            void* (*body)(void*), void* argument) noexcept {
     if (test::refusesThreads) return EAGAIN;
-    using Create = int (*)(pthread_t*, const pthread_attr_t*, void* (*)(void*), void*);
-    static const auto next = reinterpret_cast<Create>(dlsym(RTLD_NEXT, "pthread_create"));
+    static const auto next = __interceptor_pthread_create != nullptr
+                                 ? &__interceptor_pthread_create
+                                 : reinterpret_cast<Create*>(dlsym(RTLD_NEXT, "pthread_create"));
     return next(thread, attributes, body, argument);
 }

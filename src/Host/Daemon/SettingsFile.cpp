@@ -1,8 +1,8 @@
-#include <toml++/toml.h>
 #include <algorithm>
 #include <stdexcept>
 
 #include "Host/Daemon/SettingsField.h"
+#include "MidAPI/Toml.h"
 
 namespace host {
 
@@ -59,11 +59,10 @@ void setField(const std::vector<SettingsField>& fields, const std::string& key, 
 }
 
 toml::table parse(const std::string& file) {
-    try {
-        return toml::parse_file(file);
-    } catch (const toml::parse_error& error) {
-        throw std::runtime_error(placeOf(file, error.source()) + ": " + std::string(error.description()));
-    }
+    toml::parse_result parsed = toml::parse_file(file);
+    if (parsed) return std::move(parsed).table();
+    const toml::parse_error& error = parsed.error();
+    throw std::runtime_error(placeOf(file, error.source()) + ": " + std::string(error.description()));
 }
 
 }  // namespace
