@@ -37,18 +37,16 @@ class Retirement {
     void add(CimInstance* instance) noexcept {
         {
             const std::lock_guard lock(m_mutex);
-            if (startThread()) {
-                append(instance);
-                instance = nullptr;
-            }
+            append(instance);
+            startThread();
         }
         m_changed.notify_all();
-        delete instance;
     }
 
     void drain() noexcept {
         std::unique_lock lock(m_mutex);
-        m_changed.wait(lock, [this] { return m_first == nullptr && !m_busy; });
+        if (m_first != nullptr && !startThread()) destroyQueued(lock);
+        m_changed.wait(lock, [this] { return m_first == nullptr && m_busy == 0; });
     }
 
   private:
@@ -71,17 +69,23 @@ class Retirement {
 
     void run() noexcept {
         std::unique_lock lock(m_mutex);
-        while (true) {
+        while (!m_ending) {
             m_changed.wait(lock, [this] { return m_first != nullptr || m_ending; });
-            if (m_first == nullptr) return;
+            destroyQueued(lock);
+        }
+    }
+
+    /// Under the lock, which it gives up while a destructor runs.
+    void destroyQueued(std::unique_lock<std::mutex>& lock) noexcept {
+        while (m_first != nullptr) {
             CimInstance* instance = m_first;
             m_first = instance->m_nextRetired;
             if (m_first == nullptr) m_last = nullptr;
-            m_busy = true;
+            ++m_busy;
             lock.unlock();
             delete instance;
             lock.lock();
-            m_busy = false;
+            --m_busy;
             m_changed.notify_all();
         }
     }
@@ -91,7 +95,7 @@ class Retirement {
     std::thread m_thread;
     CimInstance* m_first = nullptr;
     CimInstance* m_last = nullptr;
-    bool m_busy = false;
+    unsigned m_busy = 0;  ///< how many are being destroyed
     bool m_ending = false;
 };
 

@@ -7,7 +7,8 @@ namespace core {
 class CimInstance;
 
 /// Destroys an instance that nobody holds any more: at once, or on a thread of its own when the instance's
-/// destructor waits. Never fails; where that thread cannot be had, it waits on the caller's.
+/// destructor waits. Never fails and never waits; where that thread cannot be had, the instance stays queued
+/// until the next retirement or the drain.
 void retireInstance(CimInstance* instance) noexcept;
 
 /// Makes sure that the thread's owner is built, and so destroyed after the object that is being built now.

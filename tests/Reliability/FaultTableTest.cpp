@@ -1,6 +1,7 @@
 // Every call that an update makes fails, throws or stalls, one at a time.
 #include <thread>
 
+#include "Framework/Retirement.h"
 #include "Providers/SoftwareUpdate/UpdateTest.h"
 #include "Reliability/Effort.h"
 #include "Reliability/Interposed.h"
@@ -173,6 +174,19 @@ TEST_F(FaultTableTest, EveryFaultEndsAsDocumentedAndTheNextUpdateWorks) {
             run(row, releases);
         }
     }
+}
+
+TEST_F(FaultTableTest, WithoutAnyThreadNobodyWaits) {
+    if (testing::UnitTest::GetInstance()->test_to_run_count() > 1)
+        GTEST_SKIP() << "another test may have left the thread that buries jobs";
+    test::refusesThreads = true;
+    EXPECT_EQ(install(goodImage(), "eth0").returnValue, kFailed);
+    EXPECT_TRUE(m_requests.enumerateInstanceNames("Quenx_ConcreteJob").empty());
+    // The destructor, which waits, is left to whoever has to wait anyway.
+    EXPECT_FALSE(test::SyslogCapture::contains("Destroying JobThread"));
+    core::drainRetired();
+    EXPECT_TRUE(test::SyslogCapture::contains("Destroying JobThread"));
+    disarm();
 }
 
 }  // namespace
