@@ -34,6 +34,16 @@ std::string findUri(const std::string& identifier) {
     return uri;
 }
 
+/// What the look-up finds; nothing where it throws, for what cannot be looked up is not found.
+template <class LookUp>
+std::string found(LookUp&& lookUp) {
+    try {
+        return lookUp();
+    } catch (...) {
+        return {};
+    }
+}
+
 std::string joined(const utils::StringArray& names) {
     std::string text;
     for (const std::string& name : names) {
@@ -82,7 +92,7 @@ ResolvedTarget resolveTarget(const MethodTraits& method, const core::CimPath& ta
     std::string adapterName;
     const std::string className = instance->getClassName();
     if (className == "Quenx_PortController") {
-        adapterName = firstPortOf(*instance);
+        adapterName = found([&] { return firstPortOf(*instance); });
     } else if (className == "Quenx_EthernetPort") {
         const auto* port = dynamic_cast<const inventory::EthernetPort*>(instance);
         if (port != nullptr) adapterName = port->getAdapterName();
@@ -101,7 +111,7 @@ ResolvedSource resolveSource(const MethodTraits& method, const core::CimPath& so
     const inventory::SoftwareIdentity* identity = imageIdentity(method, source);
     if (identity == nullptr) return {MethodReturn::InvalidParameter, {}, {}};
     const std::string identifier = identity->getIdentifier();
-    std::string uri = findUri(identifier);
+    std::string uri = found([&] { return findUri(identifier); });
     if (uri.empty()) {
         QUENX_DEBUG("Could not obtain URI from the SoftwareIdentityResource (%s)", identifier.c_str());
         return {MethodReturn::InvalidParameter, {}, {}};

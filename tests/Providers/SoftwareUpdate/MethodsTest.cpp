@@ -260,6 +260,16 @@ TEST_F(MethodsTest, AnswerEachCallWithItsValueLineJobAndClaim) {
     EXPECT_EQ(test::componentsOf("eth1"), "IMG_PXE 1, IMG_UEFI 0");
 }
 
+TEST_F(MethodsTest, WhatCannotBeLookedUpIsNotFound) {
+    // The controller is found, and then its ports are not.
+    int enumerations = 0;
+    m_backend->hook = [&](const std::string& operation, const std::string&) {
+        if (operation == "enumerateAdapters" && ++enumerations == 2) throw std::runtime_error("gone");
+    };
+    EXPECT_EQ(outcome(fromUri(m_uri, m_controller)), 5U);
+    EXPECT_TRUE(test::SyslogCapture::contains("Firmware Update does not support instance '"));
+}
+
 TEST_F(MethodsTest, FlashARealImageByteForByte) {
     const CallResult result =
         install("file://" + test::realRomPath("efi-virtio"), "eth0", {5, 32768}, {"", "IMG_UEFI + IMG_PXE"});
