@@ -10,14 +10,13 @@
 
 namespace {
 
-void associate(const Quenx_ConcreteJob& job, const CIM_ManagedElement* affected,
-               core::InstanceList& rebuilt) {
+void associate(const Quenx_ConcreteJob& job, const CIM_ManagedElement* affected, Rebuild& rebuilt) {
     auto association = std::make_unique<Quenx_AffectedJobElement>();
     association->AffectedElement = affected;
     association->AffectingElement = &job;
     association->ElementEffects.setNull();
     association->OtherElementEffectsDescriptions.setNull();
-    rebuilt.add(association.release());
+    rebuilt.add(std::move(association));
 }
 
 }  // namespace
@@ -38,19 +37,18 @@ std::string Quenx_AffectedJobElementClass::getClassName() {
 utils::SafeList<core::CimInstance*>::Iterator Quenx_AffectedJobElementClass::getInstances() {
     QUENX_DEBUG("getInstances");
     const utils::TimeStamp timing("Quenx_AffectedJobElementClass::getInstances");
-    rebuild(m_instances, [](core::InstanceList& rebuilt) {
-        core::InstanceRange jobs(core::GetCimBroker()->getInstances(
-            "Quenx_ConcreteJob", core::SoftwareUpdateAgent::CIM_PROVIDER_NAME));
-        const AdapterIndex adapters;
-        for (const core::CimInstance* each : jobs) {
-            const auto* job = dynamic_cast<const Quenx_ConcreteJob*>(each);
-            const IndexedPort* port = job == nullptr ? nullptr : adapters.findPort(job->getAdapterName());
-            if (port == nullptr) continue;
-            associate(*job, port->element, rebuilt);
-            for (const CIM_ManagedElement* controller : adapters.controllersOf(*port)) {
-                associate(*job, controller, rebuilt);
-            }
-        }
-    });
+    Rebuild rebuilt(m_instances);
+    core::InstanceRange jobs(core::GetCimBroker()->getInstances(
+        "Quenx_ConcreteJob", core::SoftwareUpdateAgent::CIM_PROVIDER_NAME));
+    const AdapterIndex adapters;
+    for (const core::CimInstance* each : jobs) {
+        const auto* job = dynamic_cast<const Quenx_ConcreteJob*>(each);
+        const IndexedPort* port = job == nullptr ? nullptr : adapters.findPort(job->getAdapterName());
+        if (port == nullptr) continue;
+        associate(*job, port->element, rebuilt);
+        for (const CIM_ManagedElement* controller : adapters.controllersOf(*port))
+            associate(*job, controller, rebuilt);
+    }
+    rebuilt.publish();
     return m_instances.getElements(false);
 }

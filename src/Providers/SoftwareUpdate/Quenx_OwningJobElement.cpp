@@ -25,16 +25,17 @@ std::string Quenx_OwningJobElementClass::getClassName() {
 utils::SafeList<core::CimInstance*>::Iterator Quenx_OwningJobElementClass::getInstances() {
     QUENX_DEBUG("getInstances");
     const utils::TimeStamp timing("Quenx_OwningJobElementClass::getInstances");
-    rebuild(m_instances, [](core::InstanceList& rebuilt) {
-        const auto service = theService();
-        const auto* owner = dynamic_cast<const CIM_ManagedElement*>(service.get());
-        for (const core::CimInstance* job : core::InstanceRange(core::GetCimBroker()->getInstances(
-                 "Quenx_ConcreteJob", core::SoftwareUpdateAgent::CIM_PROVIDER_NAME))) {
-            auto association = std::make_unique<Quenx_OwningJobElement>();
-            association->OwningElement = owner;
-            association->OwnedElement = dynamic_cast<const CIM_Job*>(job);
-            rebuilt.add(association.release());
-        }
-    });
+    Rebuild rebuilt(m_instances);
+    core::InstanceRange services(allServices());
+    core::InstanceRange jobs(core::GetCimBroker()->getInstances(
+        "Quenx_ConcreteJob", core::SoftwareUpdateAgent::CIM_PROVIDER_NAME));
+    const auto* owner = dynamic_cast<const CIM_ManagedElement*>(onlyService(services));
+    for (const core::CimInstance* job : jobs) {
+        auto association = std::make_unique<Quenx_OwningJobElement>();
+        association->OwningElement = owner;
+        association->OwnedElement = dynamic_cast<const CIM_Job*>(job);
+        rebuilt.add(std::move(association));
+    }
+    rebuilt.publish();
     return m_instances.getElements(false);
 }

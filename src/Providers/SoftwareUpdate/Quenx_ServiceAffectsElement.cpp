@@ -14,14 +14,14 @@
 
 namespace {
 
-void associate(const CIM_Service* service, const CIM_ManagedElement* affected, core::InstanceList& rebuilt) {
+void associate(const CIM_Service* service, const CIM_ManagedElement* affected, Rebuild& rebuilt) {
     auto association = std::make_unique<Quenx_ServiceAffectsElement>();
     association->AffectedElement = affected;
     association->AffectingElement = service;
     association->ElementEffects.setNull();
     association->OtherElementEffectsDescriptions.setNull();
     association->AssignedSequence.setNull();
-    rebuilt.add(association.release());
+    rebuilt.add(std::move(association));
 }
 
 bool isSupportedType(const std::string& type) {
@@ -36,8 +36,7 @@ bool isInstallable(const inventory::SoftwareIdentity& identity) {
     return !types.empty() && std::all_of(types.begin(), types.end(), isSupportedType);
 }
 
-void associateAdapters(const CIM_Service* service, core::InstanceList& rebuilt) {
-    const AdapterIndex adapters;
+void associateAdapters(const CIM_Service* service, const AdapterIndex& adapters, Rebuild& rebuilt) {
     for (const IndexedPort& port : adapters.ports()) {
         const auto controllers = adapters.controllersOf(port);
         if (controllers.empty() || !ma::getCanBeUpdated(port.adapterName)) continue;
@@ -66,16 +65,17 @@ std::string Quenx_ServiceAffectsElementClass::getClassName() {
 utils::SafeList<core::CimInstance*>::Iterator Quenx_ServiceAffectsElementClass::getInstances() {
     QUENX_DEBUG("getInstances");
     const utils::TimeStamp timing("Quenx_ServiceAffectsElementClass::getInstances");
-    rebuild(m_instances, [](core::InstanceList& rebuilt) {
-        const auto instance = theService();
-        const auto* service = dynamic_cast<const CIM_Service*>(instance.get());
-        associateAdapters(service, rebuilt);
-        for (const core::CimInstance* each :
-             core::InstanceRange(core::GetCimBroker()->getInstances("Quenx_SoftwareIdentity", ""))) {
-            const auto* identity = dynamic_cast<const inventory::SoftwareIdentity*>(each);
-            if (identity == nullptr || !isInstallable(*identity)) continue;
-            associate(service, dynamic_cast<const CIM_ManagedElement*>(each), rebuilt);
-        }
-    });
+    Rebuild rebuilt(m_instances);
+    core::InstanceRange services(allServices());
+    const AdapterIndex adapters;
+    core::InstanceRange identities(core::GetCimBroker()->getInstances("Quenx_SoftwareIdentity", ""));
+    const auto* service = dynamic_cast<const CIM_Service*>(onlyService(services));
+    associateAdapters(service, adapters, rebuilt);
+    for (const core::CimInstance* each : identities) {
+        const auto* identity = dynamic_cast<const inventory::SoftwareIdentity*>(each);
+        if (identity == nullptr || !isInstallable(*identity)) continue;
+        associate(service, dynamic_cast<const CIM_ManagedElement*>(each), rebuilt);
+    }
+    rebuilt.publish();
     return m_instances.getElements(false);
 }

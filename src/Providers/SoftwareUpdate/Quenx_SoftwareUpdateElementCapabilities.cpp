@@ -34,12 +34,13 @@ utils::SafeList<core::CimInstance*>::Iterator Quenx_SoftwareUpdateElementCapabil
     const utils::TimeStamp timing("Quenx_SoftwareUpdateElementCapabilitiesClass::getInstances");
     const utils::Mutex::AutoLocker lock(m_creation);
     if (m_instances.size() == 0) {
-        const auto service = theService();
+        core::InstanceRange services(allServices());
         auto capabilities =
             core::GetCimBroker()->getInstances("Quenx_SoftwareInstallationServiceCapabilities", "");
+        const core::CimInstance* service = onlyService(services);
         QUENX_ASSERT_TEXT(capabilities.size() == 1, __FILE__, __LINE__, "(int)capabilities.size() == 1");
         auto association = std::make_unique<Quenx_SoftwareUpdateElementCapabilities>();
-        association->ManagedElement = dynamic_cast<const CIM_ManagedElement*>(service.get());
+        association->ManagedElement = dynamic_cast<const CIM_ManagedElement*>(service);
         association->Capabilities = dynamic_cast<const CIM_Capabilities*>(capabilities.first());
         association->Characteristics = {kDefault, kCurrent};
         m_instances.add(association.release());

@@ -10,8 +10,7 @@
 
 namespace {
 
-void associate(const CIM_RegisteredProfile& profile, core::InstanceRange& services,
-               core::InstanceList& rebuilt) {
+void associate(const CIM_RegisteredProfile& profile, core::InstanceRange& services, Rebuild& rebuilt) {
     for (const core::CimInstance* each : services) {
         const auto* service = dynamic_cast<const CIM_SoftwareInstallationService*>(each);
         if (service == nullptr) continue;
@@ -19,7 +18,7 @@ void associate(const CIM_RegisteredProfile& profile, core::InstanceRange& servic
         auto conformance = std::make_unique<Quenx_SoftwareUpdateElementConformsToProfile>();
         conformance->ConformantStandard = &profile;
         conformance->ManagedElement = service;
-        rebuilt.add(conformance.release());
+        rebuilt.add(std::move(conformance));
     }
 }
 
@@ -42,21 +41,20 @@ utils::SafeList<core::CimInstance*>::Iterator
 Quenx_SoftwareUpdateElementConformsToProfileClass::getInstances() {
     QUENX_DEBUG("getInstances");
     const utils::TimeStamp timing("ElementConformsToProfile::getInstances");
-    rebuild(m_instances, [](core::InstanceList& rebuilt) {
-        core::CimBroker* broker = core::GetCimBroker();
-        core::InstanceRange profiles(broker->getInstances("Quenx_RegisteredProfile", ""));
-        QUENX_DEBUG("Quenx_RegisteredProfile return %d instances", static_cast<int>(profiles.size()));
-        core::InstanceRange services(broker->getInstances("Quenx_SoftwareInstallationService", ""));
-        QUENX_DEBUG("Quenx_SoftwareInstallationService return %d instances",
-                    static_cast<int>(services.size()));
-        for (const core::CimInstance* each : profiles) {
-            const auto* profile = dynamic_cast<const CIM_RegisteredProfile*>(each);
-            if (profile == nullptr) continue;
-            const std::string id = profile->InstanceID.get();
-            QUENX_DEBUG("['%s']", id.c_str());
-            if (id == ProfileName::SoftwareUpdate) associate(*profile, services, rebuilt);
-        }
-    });
+    Rebuild rebuilt(m_instances);
+    core::CimBroker* broker = core::GetCimBroker();
+    core::InstanceRange profiles(broker->getInstances("Quenx_RegisteredProfile", ""));
+    QUENX_DEBUG("Quenx_RegisteredProfile return %d instances", static_cast<int>(profiles.size()));
+    core::InstanceRange services(broker->getInstances("Quenx_SoftwareInstallationService", ""));
+    QUENX_DEBUG("Quenx_SoftwareInstallationService return %d instances", static_cast<int>(services.size()));
+    for (const core::CimInstance* each : profiles) {
+        const auto* profile = dynamic_cast<const CIM_RegisteredProfile*>(each);
+        if (profile == nullptr) continue;
+        const std::string id = profile->InstanceID.get();
+        QUENX_DEBUG("['%s']", id.c_str());
+        if (id == ProfileName::SoftwareUpdate) associate(*profile, services, rebuilt);
+    }
+    rebuilt.publish();
     QUENX_DEBUG("return %d", static_cast<int>(m_instances.size()));
     return m_instances.getElements(false);
 }

@@ -23,25 +23,26 @@ std::string Quenx_SoftwareUpdateReferencedProfileClass::getClassName() {
 utils::SafeList<core::CimInstance*>::Iterator Quenx_SoftwareUpdateReferencedProfileClass::getInstances() {
     QUENX_DEBUG("getInstances");
     const utils::TimeStamp timing("ReferencedProfile::getInstances");
-    rebuild(m_instances, [](core::InstanceList& rebuilt) {
-        core::InstanceRange profiles(core::GetCimBroker()->getInstances("Quenx_RegisteredProfile", ""));
-        QUENX_DEBUG("Quenx_RegisteredProfile return %d instances", static_cast<int>(profiles.size()));
-        // The last of several with one InstanceID wins (intended).
-        const CIM_RegisteredProfile* antecedent = nullptr;
-        const CIM_RegisteredProfile* dependent = nullptr;
-        for (const core::CimInstance* each : profiles) {
-            const auto* profile = dynamic_cast<const CIM_RegisteredProfile*>(each);
-            if (profile == nullptr) continue;
-            const std::string id = profile->InstanceID.get();
-            if (id == ProfileName::EthernetPort) antecedent = profile;
-            if (id == ProfileName::SoftwareUpdate) dependent = profile;
-        }
-        if (antecedent == nullptr || dependent == nullptr) return;
+    Rebuild rebuilt(m_instances);
+    core::InstanceRange profiles(core::GetCimBroker()->getInstances("Quenx_RegisteredProfile", ""));
+    QUENX_DEBUG("Quenx_RegisteredProfile return %d instances", static_cast<int>(profiles.size()));
+    // The last of several with one InstanceID wins (intended).
+    const CIM_RegisteredProfile* antecedent = nullptr;
+    const CIM_RegisteredProfile* dependent = nullptr;
+    for (const core::CimInstance* each : profiles) {
+        const auto* profile = dynamic_cast<const CIM_RegisteredProfile*>(each);
+        if (profile == nullptr) continue;
+        const std::string id = profile->InstanceID.get();
+        if (id == ProfileName::EthernetPort) antecedent = profile;
+        if (id == ProfileName::SoftwareUpdate) dependent = profile;
+    }
+    if (antecedent != nullptr && dependent != nullptr) {
         auto reference = std::make_unique<Quenx_SoftwareUpdateReferencedProfile>();
         reference->Antecedent = antecedent;
         reference->Dependent = dependent;
-        rebuilt.add(reference.release());
-    });
+        rebuilt.add(std::move(reference));
+    }
+    rebuilt.publish();
     QUENX_DEBUG("return %d", static_cast<int>(m_instances.size()));
     return m_instances.getElements(false);
 }

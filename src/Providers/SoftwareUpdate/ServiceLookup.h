@@ -1,9 +1,10 @@
 #pragma once
 
-#include <memory>
+#include "Framework/InstanceRange.h"
 
-#include "Framework/CimInstance.h"
+/// Enumerates the installation services, whoever provides them.
+utils::SafeList<core::CimInstance*>::Iterator allServices();
 
-/// The one installation service, held. Throws the assertion "(int)services.size() == 1" when there is not
-/// exactly one.
-std::shared_ptr<const core::CimInstance> theService();
+/// The one among them, which the range holds. Throws the assertion "(int)services.size() == 1" when there is
+/// not exactly one.
+const core::CimInstance* onlyService(core::InstanceRange& services);
