@@ -118,13 +118,19 @@ void Quenx_ConcreteJob::setJobState(JobStateVal state) {
     m_servicedAdapter = std::string();
 }
 
+bool Quenx_ConcreteJob::claimStart() {
+    const utils::Mutex::AutoLocker lock(m_stateMutex);
+    if (m_jobState != JobStateNew) return false;
+    return !std::exchange(m_startClaimed, true);
+}
+
 unsigned int Quenx_ConcreteJob::requestStateChange(RequestedState state, utils::Time) {
     QUENX_DEBUG("New request %d", state);
     if (state != RequestedStateStart) {
         QUENX_ERROR("Not supported new state %d", state);
         return kUnsupportedState;
     }
-    if (getJobState() != JobStateNew) {
+    if (!claimStart()) {
         QUENX_ERROR("Cannot start job that is not in 'NEW' state");
         return kInvalidStateTransition;
     }

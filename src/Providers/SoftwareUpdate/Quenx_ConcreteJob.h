@@ -99,6 +99,8 @@ class Quenx_ConcreteJob : public CIM_ConcreteJob {
 
   private:
     void setUnknownProperties();
+    /// True for the one caller who may start the job.
+    bool claimStart();
 
     const std::string m_adapterName;
     const int m_jobId;
@@ -109,6 +111,7 @@ class Quenx_ConcreteJob : public CIM_ConcreteJob {
     const utils::Time m_startTime;
     utils::Time m_elapsedTime QUENX_GUARDED_BY(m_stateMutex);
     JobStateVal m_jobState QUENX_GUARDED_BY(m_stateMutex) = JobStateNew;
+    bool m_startClaimed QUENX_GUARDED_BY(m_stateMutex) = false;
     bool m_finished QUENX_GUARDED_BY(m_stateMutex) = false;
     utils::Mutex m_jobMutex;  ///< one thread operation at a time
     utils::Time m_timeOfLastStateChange QUENX_GUARDED_BY(m_stateMutex){0ULL};
