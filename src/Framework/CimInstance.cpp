@@ -51,8 +51,8 @@ unsigned int CimInstance::invokeMethod(std::string name, CimPropertyList& in, Ci
     return (this->*(method->second))(in, out, result);
 }
 
-void CimInstance::registerMethod(const char* name, Method method) {
-    m_methods.emplace_back(name, method);
+void CimInstance::registerMethod(std::string name, Method method) {
+    m_methods.emplace_back(std::move(name), method);
 }
 
 void CimInstance::setDeleted(bool deleted) {

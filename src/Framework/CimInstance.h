@@ -72,9 +72,9 @@ class QUENX_EXPORT CimInstance : public std::enable_shared_from_this<CimInstance
   protected:
     /// Registers a method under its CIM name; called in constructors. The member may be virtual.
     template <class T>
-    void addMethod(const char* name,
+    void addMethod(std::string name,
                    unsigned int (T::*method)(CimPropertyList&, CimPropertyList&, CimInstance*&)) {
-        registerMethod(name, static_cast<Method>(method));
+        registerMethod(std::move(name), static_cast<Method>(method));
     }
 
     /// Says that the properties built since the last call belong to this class. Called at the end of each
@@ -93,7 +93,7 @@ class QUENX_EXPORT CimInstance : public std::enable_shared_from_this<CimInstance
 
     const PropertyShape& shape() const QUENX_REQUIRES(m_mutex);
     std::vector<CimProperty*> select(const std::vector<std::size_t>& indices) const;
-    void registerMethod(const char* name, Method method);
+    void registerMethod(std::string name, Method method);
     void registerProperty(CimProperty* property);
     void unregisterProperty(CimProperty* property) noexcept;
 
@@ -101,7 +101,7 @@ class QUENX_EXPORT CimInstance : public std::enable_shared_from_this<CimInstance
     std::vector<CimProperty*> m_properties;
     mutable std::shared_ptr<const PropertyShape> m_shape
         QUENX_GUARDED_BY(m_mutex);  ///< found at the first use
-    std::vector<std::pair<const char*, Method>> m_methods;
+    std::vector<std::pair<std::string, Method>> m_methods;
     const CimClassInfo* m_classInfo = nullptr;
     std::weak_ptr<InstanceListLink> m_list;  ///< set once, when the instance is added
     CimInstance* m_nextRetired = nullptr;  ///< links the queue of instances to destroy, without an allocation

@@ -53,12 +53,25 @@ CallLists listsFor(const MethodDeclaration& method, const std::vector<Argument>&
     return lists;
 }
 
-MethodResult resultOf(unsigned int returnValue, const CallLists& lists, const CimInstance* handedBack,
+bool sameValues(const CimValue& left, const CimValue& right) {
+    if (const CimScalar* scalar = left.scalar())
+        return right.scalar() != nullptr && sameValue(*scalar, *right.scalar());
+    const auto* elements = left.elements();
+    const auto* others = right.elements();
+    if (elements == nullptr || others == nullptr) return left.isNull() && right.isNull();
+    return std::equal(elements->begin(), elements->end(), others->begin(), others->end(), sameValue);
+}
+
+/// What the method has put out: of its outputs, not those that still are what the client gave for them.
+MethodResult resultOf(unsigned int returnValue, const CallLists& lists,
+                      const std::vector<Argument>& arguments, const CimInstance* handedBack,
                       const std::string& namespaceName) {
     MethodResult result{returnValue, {}};
     for (const auto& property : lists.out.getProperties()) {
-        if (sameName(property->getName(), kJobParameter)) continue;  // not what a client gave for it
+        if (sameName(property->getName(), kJobParameter)) continue;  // an instance, handed back
         CimValue value = property->getValue();
+        const Argument* given = findArgument(arguments, property->getName());
+        if (given != nullptr && sameValues(given->value, value)) continue;
         if (!value.isNull()) result.outputs.push_back({property->getName(), std::move(value)});
     }
     if (handedBack != nullptr) {
@@ -86,7 +99,7 @@ MethodResult CimRequests::invokeMethod(CimPath path, const std::string& method,
         CimInstance* handedBack = nullptr;
         const unsigned int returnValue =
             instance.invokeMethod(declared->name, lists.in, lists.out, handedBack);
-        return resultOf(returnValue, lists, handedBack, m_namespace);
+        return resultOf(returnValue, lists, arguments, handedBack, m_namespace);
     });
 }
 

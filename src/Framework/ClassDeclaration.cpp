@@ -13,26 +13,32 @@ namespace core {
 
 namespace {
 
-/// What the superclasses have declared: names, and which of them are keys.
+std::string referenceClassOf(const CimProperty& property) {
+    const char* target = property.getReferenceClass();
+    return target ? target : "";
+}
+
+/// What the superclasses have declared: names, with the class that each reference leads to, and which of them
+/// are keys.
 struct Inherited {
-    std::set<std::string> names;
+    std::map<std::string, std::string> referenceClasses;
     std::set<std::string> keys;
 
     void add(const CimProperty& property) {
-        names.insert(foldName(property.getName()));
+        referenceClasses[foldName(property.getName())] = referenceClassOf(property);
         if (property.isKey()) keys.insert(foldName(property.getName()));
     }
     bool isNews(const CimProperty& property) const {
         const std::string name = foldName(property.getName());
-        return !names.contains(name) || (property.isKey() && !keys.contains(name)) ||
-               property.getReferenceClass() != nullptr;  // an overridden reference narrows its class
+        const auto inherited = referenceClasses.find(name);
+        return inherited == referenceClasses.end() || (property.isKey() && !keys.contains(name)) ||
+               inherited->second != referenceClassOf(property);  // a reference narrows its class
     }
 };
 
 PropertyDeclaration declare(CimProperty& property) {
-    const char* target = property.getReferenceClass();
     return {property.getName(), property.getType(), property.isArray(), property.isKey(),
-            target ? target : ""};
+            referenceClassOf(property)};
 }
 
 /// The properties that the class adds, read off an instance of it.

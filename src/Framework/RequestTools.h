@@ -20,6 +20,8 @@ auto answering(Body&& body) {
         throw;
     } catch (const std::exception& failure) {
         throw CimError(CimStatus::Failed, failure.what());
+    } catch (...) {
+        throw CimError(CimStatus::Failed, "the provider failed without saying why");
     }
 }
 

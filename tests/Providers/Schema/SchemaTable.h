@@ -118,7 +118,7 @@ inline constexpr SchemaRow kSchemaTable[] = {
      "+ExtendedResourceTypeMinorVersion:Uint16 +ExtendedResourceTypeRevisionNumber:Uint16 "
      "+ExtendedResourceTypeBuildNumber:Uint16 ..."},
     {"CIM_ElementSoftwareIdentity", "CIM_Dependency",
-     "+Antecedent:>CIM_SoftwareIdentity* +Dependent:>CIM_ManagedElement* +UpgradeCondition:Uint16 "
+     "+Antecedent:>CIM_SoftwareIdentity* Dependent:>CIM_ManagedElement* +UpgradeCondition:Uint16 "
      "+OtherUpgradeCondition:String +ElementSoftwareStatus:Uint16_arr"},
 };
 // clang-format on
