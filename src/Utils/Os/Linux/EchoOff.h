@@ -1,26 +1,59 @@
 #pragma once
 
+#include <signal.h>
 #include <termios.h>
 #include <unistd.h>
 
+#include <array>
+#include <cstddef>
+
 namespace os {
 
-/// Nothing typed on the terminal of standard input is shown while one exists. Prompt after making it: what
-/// was typed before is thrown away.
+/// Nothing typed on the terminal of standard input is shown while one exists, and a signal that ends the
+/// program gives the terminal back first; Ctrl-Z has to wait. Prompt after making it: what was typed before
+/// is thrown away. Without a terminal nothing happens. One at a time.
 class EchoOff {
   public:
     EchoOff() {
-        tcgetattr(STDIN_FILENO, &m_saved);
-        termios silent = m_saved;
+        if (tcgetattr(STDIN_FILENO, &s_saved) != 0) return;
+        m_isTerminal = true;
+        for (std::size_t i = 0; i < SIGNALS.size(); ++i)
+            replace(SIGNALS[i], m_actions[i]);
+        termios silent = s_saved;
         silent.c_lflag &= ~static_cast<tcflag_t>(ECHO);
+        silent.c_lflag |= NOFLSH;  // Ctrl-Z does not drop half a password either
         tcsetattr(STDIN_FILENO, TCSAFLUSH, &silent);
     }
-    ~EchoOff() { tcsetattr(STDIN_FILENO, TCSADRAIN, &m_saved); }
+    ~EchoOff() {
+        if (!m_isTerminal) return;
+        tcsetattr(STDIN_FILENO, TCSADRAIN, &s_saved);
+        for (std::size_t i = 0; i < SIGNALS.size(); ++i)
+            sigaction(SIGNALS[i], &m_actions[i], nullptr);
+    }
     EchoOff(const EchoOff&) = delete;
     EchoOff& operator=(const EchoOff&) = delete;
 
   private:
-    termios m_saved{};
+    static constexpr std::array<int, 5> SIGNALS = {SIGINT, SIGTERM, SIGHUP, SIGQUIT, SIGTSTP};
+
+    /// What was typed of a password is not left to the program that reads next.
+    static void restoreAndEnd(int number) {
+        tcsetattr(STDIN_FILENO, TCSAFLUSH, &s_saved);
+        signal(number, SIG_DFL);
+        raise(number);
+    }
+
+    static void replace(int number, struct sigaction& before) {
+        struct sigaction action = {};
+        action.sa_handler = number == SIGTSTP ? SIG_IGN : &restoreAndEnd;
+        sigaction(number, nullptr, &before);
+        // One that is ignored, as under nohup, stays so.
+        if (before.sa_handler != SIG_IGN) sigaction(number, &action, nullptr);
+    }
+
+    static inline termios s_saved{};  ///< where a signal handler finds it
+    std::array<struct sigaction, SIGNALS.size()> m_actions{};
+    bool m_isTerminal = false;
 };
 
 }  // namespace os
