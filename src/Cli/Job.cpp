@@ -7,13 +7,21 @@
 
 namespace cli {
 
-unsigned JobView::certainPercent() const {
+std::optional<unsigned> JobView::certainPercent() const {
     constexpr unsigned NOT_YET = 99;
-    return hasSucceeded() ? 100 : std::min(percent, NOT_YET);
+    if (hasSucceeded()) return 100;
+    return hasEnded() ? std::nullopt : std::optional(std::min(percent, NOT_YET));
 }
 
 JobView readJob(Management& management, const core::CimPath& path) {
     return viewOf(management.getInstance(path));
+}
+
+std::vector<JobView> readJobs(Management& management) {
+    std::vector<JobView> jobs;
+    for (const core::InstanceValue& job : management.enumerateInstances("Quenx_ConcreteJob"))
+        jobs.push_back(viewOf(job));
+    return jobs;
 }
 
 JobView viewOf(const core::InstanceValue& job) {

@@ -1,7 +1,9 @@
 #pragma once
 
 #include <cstdint>
+#include <optional>
 #include <string>
+#include <vector>
 
 #include "Cli/Management.h"
 
@@ -28,12 +30,15 @@ struct JobView {
     /// No further change will come.
     bool hasEnded() const { return state >= JOB_COMPLETED && state <= JOB_EXCEPTION; }
     bool hasSucceeded() const { return state == JOB_COMPLETED; }
-    /// What is done for certain: a job reports 100 % too when it failed, so only a completed one is believed.
-    unsigned certainPercent() const;
+    /// What is done for certain. A job that failed reports 100 % and tells nothing; one that runs is not
+    /// done.
+    std::optional<unsigned> certainPercent() const;
 };
 
 JobView viewOf(const core::InstanceValue& job);
 JobView readJob(Management& management, const core::CimPath& path);
+/// All jobs that the service knows.
+std::vector<JobView> readJobs(Management& management);
 
 /// The state's name: "Running", "Completed".
 std::string jobStateName(std::uint16_t state);

@@ -3,6 +3,7 @@
 #include <algorithm>
 
 #include "Cli/Failure.h"
+#include "Framework/CimError.h"
 
 namespace cli {
 
@@ -18,8 +19,14 @@ JobView lookAt(Management& management, const core::CimPath& job, const Following
         } catch (const Failure& failure) {
             if (failures == MOST_FAILURES) {
                 throw Failure(failure.status(), failure.what(),
-                              "The update goes on all the same; \"quenxctl jobs\" shows how it ends.");
+                              "The update goes on all the same; \"quenxctl jobs\" shows how it ends, and "
+                              "after a restart of the server \"quenxctl adapters\" which version is there.");
             }
+        } catch (const core::CimError& error) {
+            if (error.status() != core::CimStatus::NotFound) throw;
+            throw Failure(ExitStatus::Failed,
+                          "The job was deleted by somebody. The update goes on to its end, unseen.",
+                          "\"quenxctl adapters\" shows the version afterwards.");
         }
         following.pause();
     }
@@ -32,8 +39,10 @@ JobView followJob(Management& management, const core::CimPath& job, UpdateObserv
     unsigned shown = 0;
     while (true) {
         const JobView view = lookAt(management, job, following);
-        shown = std::max(shown, view.certainPercent());
-        observer.progressed(shown);
+        if (const auto percent = view.certainPercent()) {
+            shown = std::max(shown, *percent);
+            observer.progressed(shown);
+        }
         if (view.hasEnded()) {
             observer.ended(view);
             return view;

@@ -16,7 +16,7 @@ struct Following {
 };
 
 /// Looks at the job until it has ended and tells the observer. Returns how it ended. Throws Failure when the
-/// job cannot be looked at for long, core::CimError when it is gone.
+/// job cannot be looked at for long, or is gone.
 JobView followJob(Management& management, const core::CimPath& job, UpdateObserver& observer,
                   const Following& following);
 

@@ -9,8 +9,6 @@ namespace cli {
 
 namespace {
 
-constexpr const char* JOB_CLASS = "Quenx_ConcreteJob";
-
 /// Jobs live as long as the process that runs them: this one has none that somebody else could have started.
 void requireServer(const Management& management) {
     if (!management.runsJobs()) return;
@@ -19,11 +17,22 @@ void requireServer(const Management& management) {
                   "Name the server with --server.");
 }
 
-std::vector<JobView> readJobs(Management& management) {
-    std::vector<JobView> jobs;
-    for (const core::InstanceValue& job : management.enumerateInstances(JOB_CLASS))
-        jobs.push_back(viewOf(job));
-    return jobs;
+std::string percentText(const JobView& job) {
+    const std::optional<unsigned> percent = job.certainPercent();
+    return percent ? std::to_string(*percent) : "-";
+}
+
+void printDeleted(Context& context, const JobView& job) {
+    if (context.json) {
+        printJson(context.out, {{"deleted", job.id}, {"updateGoesOn", !job.hasEnded()}});
+        return;
+    }
+    context.out << "Deleted " << job.id << ".\n";
+    if (!job.hasEnded()) {
+        context.out
+            << "The update goes on to its end and can no longer be followed; other updates are refused "
+               "until then.\n\"quenxctl adapters\" shows the version afterwards.\n";
+    }
 }
 
 }  // namespace
@@ -40,7 +49,7 @@ ExitStatus showJobs(Context& context) {
     }
     std::vector<std::vector<std::string>> rows = {{"JOB", "STATE", "PERCENT", "ERROR"}};
     for (const JobView& job : jobs) {
-        rows.push_back({job.id, jobStateName(job.state), std::to_string(job.percent), job.errorDescription});
+        rows.push_back({job.id, jobStateName(job.state), percentText(job), job.errorDescription});
     }
     printTable(context.out, rows);
     return ExitStatus::Done;
@@ -51,11 +60,7 @@ ExitStatus deleteJob(Context& context, const std::string& id) {
     for (const JobView& job : readJobs(context.management)) {
         if (job.id != id && job.path.toString() != id) continue;
         context.management.deleteInstance(job.path);
-        if (context.json) {
-            printJson(context.out, {{"deleted", job.id}});
-        } else {
-            context.out << "Deleted " << job.id << ".\n";
-        }
+        printDeleted(context, job);
         return ExitStatus::Done;
     }
     throw Failure(ExitStatus::Failed, "There is no job \"" + id + "\".", "\"quenxctl jobs\" lists the jobs.");

@@ -18,7 +18,8 @@ class UpdateObserver {
 
     /// @param bytes  size of what is written; 0 when that is not known
     virtual void started(const std::string& adapter, std::uint64_t bytes) = 0;
-    /// At every look at the job; never less than before, and 100 only when the job completed.
+    /// At every look at the job that shows how far it is; never less than before, and 100 only when the job
+    /// completed.
     virtual void progressed(unsigned percent) = 0;
     /// The user wants to stop, which an update cannot.
     virtual void interrupted() = 0;
