@@ -1,10 +1,11 @@
 #include "Cli/Arguments.h"
 
 #include <CLI/CLI.hpp>
-#include <iostream>
+#include <algorithm>
 #include <memory>
+#include <string_view>
 
-#include "Cli/Terminal.h"
+#include "Cli/Failure.h"
 #include "Utils/Utils.h"
 
 #ifndef QUENX_VERSION
@@ -19,10 +20,8 @@ constexpr const char* FOOTER =
     "Exit status:\n"
     "  0  done\n"
     "  1  failed: the message says what happened and what to do next\n"
-    "  2  wrong use: an option, a name or a file that cannot be right\n"
-    "  3  already current: what was to be installed is what is installed (see --force)\n"
-    "\n"
-    "An update that has begun always runs to its end: Ctrl-C does not stop it, the program waits for it.\n";
+    "  2  wrong use: the command line itself is wrong, or a file that an option names cannot be used\n"
+    "  3  already current: what was to be installed is what is installed (see --force)\n";
 
 std::vector<std::string> typesOf(std::string text) {
     utils::replaceCharacter(text, '+', ',');
@@ -35,9 +34,10 @@ std::vector<std::string> typesOf(std::string text) {
 void addServerOptions(CLI::App& app, Arguments& arguments, const std::vector<CLI::Option*>& localOptions) {
     ServerSettings& server = arguments.server;
     CLI::Option* url =
-        app.add_option("--server", server.url,
-                       "Work on a WBEM server, https://host:5989, and not in this process; images are "
-                       "then files of that host")
+        app.add_option_function<std::string>(
+               "--server", [&arguments](const std::string& text) { arguments.serverUrl.emplace(text); },
+               "Work on a WBEM server, https://host:5989, and not in this process; images are "
+               "then files of that host")
             ->type_name("URL");
     for (CLI::Option* option : localOptions)
         option->excludes(url);
@@ -100,7 +100,9 @@ void addInstall(CLI::App& app, Arguments& arguments) {
         ->type_name("TYPES")
         ->excludes(identity);
     verb->add_flag("--force", order->force, "Install an older image too, and one that is installed already");
-    verb->footer(FOOTER);
+    verb->footer(
+        "An update that has begun always runs to its end: Ctrl-C does not stop it, the program waits for "
+        "it.");
     verb->callback([=, &arguments] {
         requireOneImage(*verb, image, identity);
         if (!types->empty()) order->types = typesOf(*types);
@@ -110,7 +112,9 @@ void addInstall(CLI::App& app, Arguments& arguments) {
 }
 
 void addCheck(CLI::App& app, Arguments& arguments) {
-    CLI::App* verb = app.add_subcommand("check", "Say whether an image could be installed; change nothing");
+    CLI::App* verb = app.add_subcommand(
+        "check",
+        "Say whether an image could be installed; nothing is written (a server may hold the adapter)");
     auto order = std::make_shared<CheckOrder>();
     verb->add_option("--target", order->target, "Adapter: its name, PCI address or object path")
         ->type_name("ADAPTER")
@@ -121,7 +125,6 @@ void addCheck(CLI::App& app, Arguments& arguments) {
     CLI::Option* identity = verb->add_option("--identity", order->identity,
                                              "Image: a software identity that \"identities\" lists")
                                 ->type_name("ID");
-    verb->footer(FOOTER);
     verb->callback([=, &arguments] {
         requireOneImage(*verb, file, identity);
         arguments.verb = [order](Context& context) { return check(context, *order); };
@@ -172,15 +175,28 @@ void addPlainVerb(CLI::App& app, Arguments& arguments, const char* name, const c
     app.add_subcommand(name, description)->callback([verb, &arguments] { arguments.verb = verb; });
 }
 
+/// The library only says that a verb is missing where one is not known.
+std::string reasonOf(const CLI::App& app, const CLI::ParseError& error) {
+    const std::vector<std::string> rest = app.remaining();
+    const bool isUnknownVerb =
+        error.get_name() == "RequiredError" && !rest.empty() && app.get_subcommands().empty();
+    return isUnknownVerb ? "There is no verb \"" + rest.front() + "\"." : std::string(error.what()) + ".";
+}
+
+std::string helpAdvice(const CLI::App& app) {
+    const auto verbs = app.get_subcommands();
+    return verbs.empty() ? "\"quenxctl --help\" lists the verbs and options."
+                         : "\"quenxctl " + verbs.front()->get_name() + " --help\" lists what it takes.";
+}
+
 }  // namespace
 
-std::optional<Arguments> readArguments(int argc, char** argv, ExitStatus& status) {
+std::optional<Arguments> readArguments(int argc, char** argv) {
     Arguments arguments;
     CLI::App app("Updates the firmware of Ethernet adapters.", "quenxctl");
     app.set_version_flag("--version", QUENX_VERSION);
     app.require_subcommand(1);
     app.fallthrough();
-    app.footer(FOOTER);
     addCommonOptions(app, arguments);
     addPlainVerb(app, arguments, "adapters", "List the adapters and the firmware on them", showAdapters);
     addPlainVerb(app, arguments, "identities",
@@ -192,25 +208,22 @@ std::optional<Arguments> readArguments(int argc, char** argv, ExitStatus& status
     addInstances(app, arguments);
     addAssociators(app, arguments);
     addPlainVerb(app, arguments, "mof", "Print the schema of all served classes as MOF", showMof);
+    app.footer(FOOTER);  // last: verbs take over the footer that is there when they are added
     try {
         app.parse(argc, argv);
-    } catch (const CLI::RequiredError& error) {
-        // Without a known verb all that follows is left over, and the library would only say that a verb is
-        // missing.
-        const std::vector<std::string> rest = app.remaining();
-        if (rest.empty() || !app.get_subcommands().empty()) {
-            app.exit(error);
-        } else {
-            std::cerr << "There is no verb \"" << printable(rest.front())
-                      << "\".\nRun with --help for the verbs.\n";
-        }
-        status = ExitStatus::WrongUse;
-        return std::nullopt;
     } catch (const CLI::ParseError& error) {
-        status = app.exit(error) == 0 ? ExitStatus::Done : ExitStatus::WrongUse;
+        if (error.get_exit_code() != 0) {
+            throw Failure(ExitStatus::WrongUse, reasonOf(app, error), helpAdvice(app));
+        }
+        app.exit(error);
         return std::nullopt;
     }
     return arguments;
+}
+
+bool asksForJson(int argc, char** argv) {
+    return std::any_of(argv, argv + argc,
+                       [](const char* word) { return std::string_view(word) == "--json"; });
 }
 
 }  // namespace cli

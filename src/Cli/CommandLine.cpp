@@ -5,6 +5,7 @@
 #include <chrono>
 #include <iostream>
 #include <memory>
+#include <string_view>
 #include <thread>
 
 #include "Cli/Arguments.h"
@@ -22,17 +23,24 @@ namespace {
 
 constexpr std::chrono::milliseconds LOOK_EVERY{50};
 constexpr std::chrono::milliseconds ASK_SERVER_EVERY{500};
+constexpr const char* ASK_LOG = "The system log has the details.";
 
 std::unique_ptr<Management> openManagement(const Arguments& arguments) {
-    if (arguments.server.url.empty()) return std::make_unique<LocalManagement>(arguments.local);
+    if (!arguments.serverUrl) return std::make_unique<LocalManagement>(arguments.local);
+    const ServerUrl& url = *arguments.serverUrl;
     ServerSettings server = arguments.server;
+    if (!url.isEncrypted() && !url.isLoopback()) {
+        std::cerr << "quenxctl: WARNING: http://: the password and all else is sent in clear. Anybody on the "
+                     "way can read it; write https:// in its place.\n";
+    }
     if (server.insecure) {
         std::cerr << "quenxctl: WARNING: --insecure: the server's certificate is not checked. Anybody on the "
                      "way can "
                      "read the password and answer in the server's place.\n";
     }
-    if (!server.user.empty()) server.password = passwordOf(server.user);
-    return std::make_unique<RemoteManagement>(server);
+    if (server.user.empty()) server.user = askUser();
+    server.password = passwordOf(server.user);
+    return std::make_unique<RemoteManagement>(url, server);
 }
 
 std::string adviceFor(core::CimStatus status) {
@@ -41,9 +49,24 @@ std::string adviceFor(core::CimStatus status) {
             return "\"quenxctl mof\" prints the classes that are served.";
         case core::CimStatus::NotFound:
             return "\"quenxctl instances CLASS --names\" prints the paths of what there is.";
+        case core::CimStatus::AccessDenied:
+            return "Log in as a user who may do this: on quenx-cimd, an administrator.";
+        case core::CimStatus::InvalidNamespace:
+            return "Check --namespace, or the line \"Namespace=\" of the configuration file.";
+        case core::CimStatus::ServerIsShuttingDown:
+            return "Try again when it has started anew.";
         default:
-            return "The system log has the details.";
+            return ASK_LOG;
     }
+}
+
+/// An error text of the model or a server, which may be no more than a few words, as a sentence.
+std::string sentence(std::string text) {
+    if (text.empty()) return "The service gave no reason.";
+    if (text.front() >= 'a' && text.front() <= 'z')
+        text.front() = static_cast<char>(text.front() - 'a' + 'A');
+    if (std::string_view(".!?").find(text.back()) == std::string_view::npos) text += '.';
+    return text;
 }
 
 ExitStatus report(bool json, ExitStatus status, const std::string& what, const std::string& advice) {
@@ -71,27 +94,29 @@ ExitStatus runVerb(const Arguments& arguments) {
     return arguments.verb(context);
 }
 
-ExitStatus runAndReport(const Arguments& arguments) {
+/// @param arguments  set once they are read
+ExitStatus runAndReport(int argc, char** argv, std::optional<Arguments>& arguments) {
+    const bool json = asksForJson(argc, argv);
     try {
-        return runVerb(arguments);
+        arguments = readArguments(argc, argv);
+        return arguments ? runVerb(*arguments) : ExitStatus::Done;
     } catch (const Failure& failure) {
-        return report(arguments.json, failure.status(), failure.what(), failure.advice());
+        return report(json, failure.status(), failure.what(), failure.advice());
     } catch (const core::CimError& error) {
-        return report(arguments.json, ExitStatus::Failed, error.what(), adviceFor(error.status()));
+        return report(json, ExitStatus::Failed, sentence(error.what()), adviceFor(error.status()));
     } catch (const std::exception& error) {
-        return report(arguments.json, ExitStatus::Failed, error.what(), "The system log has the details.");
+        return report(json, ExitStatus::Failed, sentence(error.what()), ASK_LOG);
     }
 }
 
 }  // namespace
 
 int runCommandLine(int argc, char** argv) {
-    ExitStatus status = ExitStatus::Done;
-    const std::optional<Arguments> arguments = readArguments(argc, argv, status);
-    if (!arguments) return static_cast<int>(status);
-    status = runAndReport(*arguments);
+    std::optional<Arguments> arguments;
+    ExitStatus status = runAndReport(argc, argv, arguments);
     // A result that nobody could read is none; an update, though, is done whoever reads of it.
-    if (!std::cout.flush() && !arguments->startsUpdate && status == ExitStatus::Done) {
+    const bool mayHaveUpdated = arguments && arguments->startsUpdate;
+    if (!std::cout.flush() && !mayHaveUpdated && status == ExitStatus::Done) {
         std::cerr << "quenxctl: the output could not be written.\n";
         status = ExitStatus::Failed;
     }

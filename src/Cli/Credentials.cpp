@@ -10,20 +10,33 @@
 
 namespace cli {
 
+namespace {
+
+/// The line that the user answers with. Throws Failure with these texts where nobody can answer.
+std::string ask(const std::string& prompt, const std::string& missing, const std::string& advice) {
+    std::string line;
+    if (isatty(STDIN_FILENO) == 1) {
+        std::cerr << prompt << std::flush;
+        if (std::getline(std::cin, line) && !line.empty()) return line;
+        std::cerr << '\n';
+    }
+    throw Failure(ExitStatus::WrongUse, missing, advice);
+}
+
+}  // namespace
+
+std::string askUser() {
+    return ask("User: ", "There is no user name to log in with.",
+               "Name the user with --user or the environment variable QUENXCTL_USER.");
+}
+
 std::string passwordOf(const std::string& user) {
     const char* given = std::getenv("QUENXCTL_PASSWORD");
     if (given != nullptr) return given;
-    if (isatty(STDIN_FILENO) != 1) {
-        throw Failure(ExitStatus::WrongUse,
-                      "There is no password for " + user + ", and no terminal to ask on.",
-                      "Put it into the environment variable QUENXCTL_PASSWORD.");
-    }
-    std::string password;
-    {
-        const os::EchoOff silence;
-        std::cerr << "Password for " << user << ": " << std::flush;
-        std::getline(std::cin, password);
-    }
+    const os::EchoOff silence;
+    std::string password =
+        ask("Password for " + user + ": ", "There is no password for " + user + ".",
+            "Put it into the environment variable QUENXCTL_PASSWORD, or type it on a terminal.");
     std::cerr << '\n';
     return password;
 }

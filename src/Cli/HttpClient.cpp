@@ -25,27 +25,25 @@ std::size_t takeBody(char* data, std::size_t, std::size_t count, void* to) {
 }
 
 std::size_t takeHeader(char* data, std::size_t, std::size_t count, void* to) {
+    auto& reply = *static_cast<HttpReply*>(to);
     const std::string_view line(data, count);
     const std::size_t colon = line.find(':');
-    if (colon != std::string_view::npos && core::sameName(line.substr(0, colon), "CIMError")) {
-        static_cast<HttpReply*>(to)->cimError = std::string(utils::trimOf(line.substr(colon + 1), " \t\r\n"));
-    }
+    if (colon == std::string_view::npos) return count;
+    const auto keep = [&](std::string_view name, std::string& value) {
+        if (!core::sameName(line.substr(0, colon), name)) return;
+        value = std::string(utils::trimOf(line.substr(colon + 1), " \t\r\n"));
+    };
+    keep("CIMError", reply.cimError);
+    keep("Retry-After", reply.retryAfter);
     return count;
-}
-
-std::string withPath(std::string url) {
-    const std::size_t authority = url.find("://");
-    const std::size_t start = authority == std::string::npos ? 0 : authority + 3;
-    const std::size_t path = url.find('/', start);
-    if (path == std::string::npos) return url + "/cimom";
-    return path + 1 == url.size() ? url + "cimom" : url;
 }
 
 std::string adviceFor(CURLcode code) {
     switch (code) {
         case CURLE_PEER_FAILED_VERIFICATION:
-        case CURLE_SSL_CACERT_BADFILE:
             return "Name the server's certificate, or the one that signed it, with --cacert.";
+        case CURLE_SSL_CACERT_BADFILE:
+            return "Name a file with certificates in PEM form, which you may read, with --cacert.";
         case CURLE_COULDNT_CONNECT:
         case CURLE_COULDNT_RESOLVE_HOST:
         case CURLE_OPERATION_TIMEDOUT:
@@ -88,8 +86,8 @@ struct HttpClient::Handle {
     }
 };
 
-HttpClient::HttpClient(const ServerSettings& settings)
-    : handle_(std::make_unique<Handle>()), url_(withPath(settings.url)) {
+HttpClient::HttpClient(const ServerUrl& url, const ServerSettings& settings)
+    : handle_(std::make_unique<Handle>()), url_(url.text()) {
     if (handle_->curl == nullptr) {
         throw Failure(ExitStatus::Failed, "The HTTP library could not be started.",
                       "Free some memory and try again.");
@@ -102,11 +100,9 @@ HttpClient::HttpClient(const ServerSettings& settings)
     handle_->set(CURLOPT_TIMEOUT, ANSWER_SECONDS);
     handle_->set(CURLOPT_WRITEFUNCTION, &takeBody);
     handle_->set(CURLOPT_HEADERFUNCTION, &takeHeader);
-    if (!settings.user.empty()) {
-        handle_->set(CURLOPT_HTTPAUTH, CURLAUTH_BASIC);
-        handle_->set(CURLOPT_USERNAME, settings.user.c_str());
-        handle_->set(CURLOPT_PASSWORD, settings.password.c_str());
-    }
+    handle_->set(CURLOPT_HTTPAUTH, CURLAUTH_BASIC);
+    handle_->set(CURLOPT_USERNAME, settings.user.c_str());
+    handle_->set(CURLOPT_PASSWORD, settings.password.c_str());
     if (!settings.caFile.empty()) handle_->set(CURLOPT_CAINFO, settings.caFile.c_str());
     if (settings.insecure) {
         handle_->set(CURLOPT_SSL_VERIFYPEER, 0L);
@@ -128,7 +124,8 @@ HttpReply HttpClient::post(const std::vector<std::string>& headers, const std::s
     const CURLcode code = curl_easy_perform(handle_->curl);
     if (code != CURLE_OK) {
         const char* reason = handle_->error[0] == '\0' ? curl_easy_strerror(code) : handle_->error;
-        throw Failure(ExitStatus::Failed, "No answer from " + url_ + ": " + reason + ".", adviceFor(code));
+        const auto status = code == CURLE_SSL_CACERT_BADFILE ? ExitStatus::WrongUse : ExitStatus::Failed;
+        throw Failure(status, "No answer from " + url_ + ": " + reason + ".", adviceFor(code));
     }
     curl_easy_getinfo(handle_->curl, CURLINFO_RESPONSE_CODE, &reply.status);
     return reply;

@@ -4,12 +4,13 @@
 #include <string>
 #include <vector>
 
+#include "Cli/ServerUrl.h"
+
 namespace cli {
 
-/// How to reach a server.
+/// How to log in to a server.
 struct ServerSettings {
-    std::string url;   ///< "https://host:5989"; without a path, that of CIM-XML is added
-    std::string user;  ///< empty: no credentials are sent
+    std::string user;
     std::string password;
     std::string caFile;     ///< certificates to trust in place of the system's; empty for those
     bool insecure = false;  ///< any certificate is taken
@@ -19,13 +20,14 @@ struct ServerSettings {
 struct HttpReply {
     long status = 0;
     std::string body;
-    std::string cimError;  ///< the header of that name
+    std::string cimError;    ///< the header of that name
+    std::string retryAfter;  ///< likewise, in seconds
 };
 
 /// Requests to one server over one connection. Used from one thread.
 class HttpClient {
   public:
-    explicit HttpClient(const ServerSettings& settings);
+    HttpClient(const ServerUrl& url, const ServerSettings& settings);
     ~HttpClient();
     HttpClient(const HttpClient&) = delete;
     HttpClient& operator=(const HttpClient&) = delete;

@@ -44,26 +44,27 @@ void selectAdapters(const LocalSettings& settings) {
     try {
         ma::configureSimulator(settings.adapterDescription, state);
     } catch (const std::exception& error) {
-        throw Failure(ExitStatus::Failed, error.what(), "Correct the adapter description and try again.");
+        throw Failure(ExitStatus::WrongUse, error.what(), "Correct the adapter description and try again.");
     }
 }
 
-void loadProviders(core::ProviderLibraries& providers, const std::string& directory) {
+/// @param status  what a directory that cannot be used means
+void loadProviders(core::ProviderLibraries& providers, const std::string& directory, ExitStatus status) {
     const std::string advice = "Name the directory that holds libQuenx_SoftwareUpdate.so with --providers.";
     try {
         providers.load(directory);
     } catch (const std::system_error& error) {
-        throw Failure(ExitStatus::Failed,
+        throw Failure(status,
                       "Cannot read the provider directory " + directory + ": " + error.code().message() + ".",
                       advice);
     }
     if (!providers.problems().empty()) {
         const auto& problem = providers.problems().front();
-        throw Failure(ExitStatus::Failed, "Cannot load " + problem.file + ": " + problem.reason + ".",
+        throw Failure(status, "Cannot load " + problem.file + ": " + problem.reason + ".",
                       "All the libraries have to come from one build; " + advice);
     }
     if (providers.loaded().empty()) {
-        throw Failure(ExitStatus::Failed, "There is no provider library in " + directory + ".", advice);
+        throw Failure(status, "There is no provider library in " + directory + ".", advice);
     }
 }
 
@@ -81,8 +82,11 @@ LocalManagement::LocalManagement(const LocalSettings& settings) {
         config_.emplace(settings.configFile);
     }
     selectAdapters(settings);
-    loadProviders(providers_, settings.providerDirectory.empty() ? defaultProviderDirectory()
-                                                                 : settings.providerDirectory);
+    if (settings.providerDirectory.empty()) {
+        loadProviders(providers_, defaultProviderDirectory(), ExitStatus::Failed);
+    } else {
+        loadProviders(providers_, settings.providerDirectory, ExitStatus::WrongUse);
+    }
     requests_.emplace(utils::SMASHv2Config::getInstance()->getNamespace());
 }
 

@@ -13,13 +13,6 @@ using cimxml::ClassName;
 using cimxml::Parameter;
 using cimxml::ParameterValue;
 
-bool isLoopbackHost(const std::string& url) {
-    std::string host = url.substr(url.find("://") == std::string::npos ? 0 : url.find("://") + 3);
-    if (host.starts_with("[::1]")) return true;
-    host = host.substr(0, host.find_first_of(":/"));
-    return host == "localhost" || host.starts_with("127.");
-}
-
 std::string percentEncoded(const std::string& text) {
     constexpr std::string_view DIGITS = "0123456789ABCDEF";
     std::string result;
@@ -68,21 +61,35 @@ core::ClassDeclaration declarationOf(const cimxml::ClassElement& element) {
 }
 
 void requireOk(const HttpReply& reply) {
-    if (reply.status == 200) return;
+    const std::string wait = reply.retryAfter.empty() ? "a while" : reply.retryAfter + " seconds";
     const std::string why = reply.cimError.empty() ? "" : " (" + reply.cimError + ")";
-    if (reply.status == 401) {
-        throw Failure(ExitStatus::Failed, "The server does not accept the user name and password.",
-                      "Give them with --user and the environment variable QUENXCTL_PASSWORD.");
+    switch (reply.status) {
+        case 200:
+            return;
+        case 401:
+            throw Failure(ExitStatus::Failed, "The server does not accept the user name and password.",
+                          "Give them with --user and the environment variable QUENXCTL_PASSWORD.");
+        case 403:
+            throw Failure(
+                ExitStatus::Failed, "The password is right, but this user may not use the server.",
+                "Log in as root, a member of quenx-admin, or one whom \"auth.readers\" of quenx-cimd "
+                "names.");
+        case 503:
+            throw Failure(ExitStatus::Failed,
+                          "The server is busy, or takes no log-ins from this address for a while because of "
+                          "wrong passwords.",
+                          "Try again in " + wait + ".");
+        default:
+            throw Failure(ExitStatus::Failed,
+                          "The server answered with HTTP status " + std::to_string(reply.status) + why + ".",
+                          "Check that --server names a CIM-XML server; its log has the details.");
     }
-    throw Failure(ExitStatus::Failed,
-                  "The server answered with HTTP status " + std::to_string(reply.status) + why + ".",
-                  "Check that --server names a CIM-XML server; its log has the details.");
 }
 
 }  // namespace
 
-RemoteManagement::RemoteManagement(const ServerSettings& settings)
-    : client_(settings), namespace_(settings.namespaceName), isLoopback_(isLoopbackHost(settings.url)) {}
+RemoteManagement::RemoteManagement(const ServerUrl& url, const ServerSettings& settings)
+    : client_(url, settings), namespace_(settings.namespaceName), isLoopback_(url.isLoopback()) {}
 
 cimxml::Response RemoteManagement::send(cimxml::Request request, const std::string& object) {
     request.messageId = std::to_string(++messages_);
@@ -111,7 +118,18 @@ cimxml::IntrinsicResult RemoteManagement::callIntrinsic(const std::string& opera
     request.call = cimxml::IntrinsicCall{operation, namespace_, std::move(parameters)};
     cimxml::Response response = send(std::move(request), namespace_);
     auto* result = std::get_if<cimxml::IntrinsicResult>(&response.content);
-    return result == nullptr ? cimxml::IntrinsicResult{} : std::move(*result);
+    if (result == nullptr) return {};
+    for (core::InstanceValue& instance : result->instances)
+        complete(instance.path);
+    for (core::CimPath& path : result->paths)
+        complete(path);
+    return std::move(*result);
+}
+
+void RemoteManagement::complete(core::CimPath& path) const {
+    if (!path.isValid()) return;
+    path.setHost("");
+    path.completeNamespace(namespace_);
 }
 
 std::vector<core::InstanceValue> RemoteManagement::enumerateInstances(const std::string& className) {

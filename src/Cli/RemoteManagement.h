@@ -13,7 +13,7 @@ namespace cli {
 /// The model of any WBEM server that serves these classes, over CIM-XML.
 class RemoteManagement : public Management {
   public:
-    explicit RemoteManagement(const ServerSettings& settings);
+    RemoteManagement(const ServerUrl& url, const ServerSettings& settings);
 
     std::vector<core::InstanceValue> enumerateInstances(const std::string& className) override;
     std::vector<core::CimPath> enumerateInstanceNames(const std::string& className) override;
@@ -32,6 +32,8 @@ class RemoteManagement : public Management {
   private:
     cimxml::IntrinsicResult callIntrinsic(const std::string& operation,
                                           std::vector<cimxml::Parameter> parameters);
+    /// Some operations answer with host and namespace, some with neither: all paths read as those in process.
+    void complete(core::CimPath& path) const;
     /// Sends the call; a CIM error in the answer is thrown as core::CimError.
     cimxml::Response send(cimxml::Request request, const std::string& object);
 

@@ -91,6 +91,11 @@ TEST_F(Server, RefusesWhomItCannotTrust) {
     const ProgramResult wrong = quenxctl({"adapters"}, "guess");
     EXPECT_EQ(wrong.status, 1);
     EXPECT_TRUE(contains(wrong.error, "does not accept the user name and password.")) << wrong.error;
+    // No other host than this one, and nobody who would answer.
+    const ProgramResult clear = test::run(
+        {QUENXCTL, "--server", "http://0.0.0.0:1", "--user", "a", "adapters"}, {"QUENXCTL_PASSWORD=a"});
+    EXPECT_TRUE(contains(clear.error, "WARNING: http://: the password and all else is sent in clear."))
+        << clear.error;
 }
 
 TEST_F(Server, AsksForThePasswordWithoutShowingIt) {
@@ -102,11 +107,23 @@ TEST_F(Server, AsksForThePasswordWithoutShowingIt) {
     EXPECT_EQ(result.status, 0) << result.out;
     EXPECT_FALSE(contains(result.out, "Password for admin: admin")) << result.out;
 
-    const ProgramResult silent = test::run({"/bin/sh", "-c", "\"$@\" </dev/null", "sh", QUENXCTL, "--server",
-                                            "https://127.0.0.1:1", "--user", "admin", "adapters"},
-                                           {"QUENXCTL_PASSWORD"});
-    EXPECT_EQ(silent.status, 2);
-    EXPECT_TRUE(contains(silent.error, "no terminal to ask on.")) << silent.error;
+    std::vector<std::string> ended = command({"adapters"});
+    ended.insert(ended.begin(), {"/bin/sh", "-c", "trap : INT; \"$@\"; stty -a", "sh"});
+    Program shell(ended, Program::Output::Terminal, {"QUENXCTL_PASSWORD"});
+    ASSERT_TRUE(shell.waitFor("Password for admin: "));
+    shell.type("adm\x03");
+    const std::string settings = shell.finish().out;
+    EXPECT_TRUE(contains(settings, " echo ")) << settings;
+
+    for (const char* user : {"admin", ""}) {
+        const ProgramResult silent =
+            test::run({"/bin/sh", "-c", "\"$@\" </dev/null", "sh", QUENXCTL, "--server",
+                       "https://127.0.0.1:1", "--user", user, "adapters"},
+                      {"QUENXCTL_PASSWORD"});
+        EXPECT_EQ(silent.status, 2);
+        EXPECT_TRUE(contains(silent.error, *user == '\0' ? "--user or the" : "variable QUENXCTL_PASSWORD"))
+            << silent.error;
+    }
 }
 
 }  // namespace
