@@ -1,3 +1,4 @@
+#include "Cli/Busyness.h"
 #include "Cli/Candidate.h"
 #include "Cli/Explanation.h"
 #include "Cli/Identities.h"
@@ -10,10 +11,12 @@ namespace cli {
 
 namespace {
 
-void judge(InstallOutcome& outcome, std::uint32_t returnValue, const Candidate& candidate) {
+void judge(InstallOutcome& outcome, Management& management, std::uint32_t returnValue,
+           const Candidate& candidate) {
     outcome.returnValue = returnValue;
+    if (returnValue == RETURN_COMPLETED) outcome.advice = holdAfterCheck(management, candidate.adapter.name);
     if (returnValue != RETURN_COMPLETED) {
-        const Explanation why = explainRefusal(returnValue, candidate);
+        const Explanation why = explainRefusal(management, returnValue, candidate);
         outcome.result = "refused";
         outcome.message = why.message;
         outcome.advice = why.advice;
@@ -44,7 +47,7 @@ ExitStatus check(Context& context, const CheckOrder& order) {
     outcome.uri = candidate.uri;
     outcome.before = candidate.adapter.components;
     outcome.after = outcome.before;
-    judge(outcome, result.returnValue, candidate);
+    judge(outcome, context.management, result.returnValue, candidate);
     return printOutcome(context, outcome);
 }
 

@@ -1,5 +1,6 @@
 #include "Cli/Explanation.h"
 
+#include "Cli/Busyness.h"
 #include "Cli/ImageUri.h"
 #include "Cli/ReturnValues.h"
 
@@ -21,6 +22,20 @@ Explanation explainFile(const Candidate& candidate) {
     if (candidate.image->isIntact()) return {};
     return {candidate.image->path + " " + candidate.image->problem + ".",
             "Name a file that is a whole firmware image and that the service may read."};
+}
+
+/// Why a server takes no file that may well be there for this program.
+Explanation explainServersFile(const Candidate& candidate) {
+    constexpr const char* MOVE =
+        "Put the image where the server may read it; a server that systemd started can have a /tmp of its "
+        "own.";
+    if (candidate.image && candidate.image->isIntact()) {
+        return {"This program can read " + candidate.image->path + ", the server cannot.", MOVE};
+    }
+    if (!candidate.image && localPath(candidate.uri)) {
+        return {"Images are files of the server's machine.", MOVE};
+    }
+    return {};
 }
 
 Explanation explainUnsupported(const Candidate& candidate) {
@@ -58,11 +73,14 @@ Explanation explainNotApplicable(const Candidate& candidate) {
     return {"The image holds no " + candidate.comparison->missing.front() + ".", ""};
 }
 
-Explanation find(std::uint32_t returnValue, const Candidate& candidate) {
+Explanation find(const Management& management, std::uint32_t returnValue, const Candidate& candidate) {
     switch (returnValue) {
         case RETURN_UNSPECIFIED:
-        case RETURN_INVALID_PARAMETER:
-            return explainFile(candidate);
+        case RETURN_INVALID_PARAMETER: {
+            const bool isOnServer = returnValue == RETURN_INVALID_PARAMETER && !management.runsJobs();
+            const Explanation found = isOnServer ? explainServersFile(candidate) : Explanation();
+            return found.message.empty() ? explainFile(candidate) : found;
+        }
         case RETURN_UNSUPPORTED_TARGET:
             return explainUnsupported(candidate);
         case RETURN_DOWNGRADE:
@@ -76,9 +94,11 @@ Explanation find(std::uint32_t returnValue, const Candidate& candidate) {
 
 }  // namespace
 
-Explanation explainRefusal(std::uint32_t returnValue, const Candidate& candidate) {
+Explanation explainRefusal(Management& management, std::uint32_t returnValue, const Candidate& candidate) {
+    const Explanation busy = explainBusyness(management, returnValue, candidate);
+    if (!busy.message.empty()) return busy;
     const ReturnValueText& general = returnValueText(returnValue);
-    const Explanation found = find(returnValue, candidate);
+    const Explanation found = find(management, returnValue, candidate);
     Explanation result;
     result.message = std::string(general.meaning) + (found.message.empty() ? "" : " ") + found.message;
     result.advice = found.advice.empty() ? general.advice : found.advice;

@@ -14,9 +14,9 @@ struct Explanation {
     std::string advice;
 };
 
-/// Why the service refused the candidate: what its return value means, and what the program finds in the file
-/// and on the adapter that explains it.
-Explanation explainRefusal(std::uint32_t returnValue, const Candidate& candidate);
+/// Why the service refused the candidate: what its return value means, and what the program finds in the
+/// file, on the adapter and among the service's jobs that explains it.
+Explanation explainRefusal(Management& management, std::uint32_t returnValue, const Candidate& candidate);
 
 /// Why a job that was started did not complete.
 Explanation explainFailedJob(const JobView& job, const std::string& adapter);

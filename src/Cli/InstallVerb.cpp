@@ -89,7 +89,7 @@ ExitStatus runInstall(Context& context, const Candidate& candidate, bool force, 
         followUpdate(context, jobOf(result), candidate, outcome);
     } else {
         outcome.result = "refused";
-        const Explanation why = explainRefusal(result.returnValue, candidate);
+        const Explanation why = explainRefusal(context.management, result.returnValue, candidate);
         outcome.message = why.message;
         outcome.advice = why.advice;
     }

@@ -13,14 +13,13 @@ constexpr const char* ASK_LOG =
 constexpr std::array<ReturnValueText, 21> TEXTS = {{
     {0, "The image can be installed.", ""},
     {1, "The service does not support this method.", "Try the other way to name the image."},
-    {2, "The image could not be read or prepared, or an update of another adapter is running.",
-     "Wait for the running update, check the file and try again."},
+    {2, "The image could not be read or prepared.", "Check the file and try again."},
     {3, "The service did not answer in time.", "Try again."},
     {4, "The update could not be started.", "Free some memory or end some processes, and try again."},
     {5, "The service cannot use the file, the target or an option.",
      "Check that the file exists, is readable and is a whole firmware image, and that the target is one that "
      "\"quenxctl adapters\" lists."},
-    {6, "The adapter is being updated already.", "Wait for that update to end and try again."},
+    {6, "The adapter is in use.", "Wait for its update to end and try again."},
     {4096, "The image is in order and the update was started.", ""},
     {4097, "The image was not made for this adapter.",
      "Get the image for this adapter's ids; \"quenxctl adapters\" shows them."},

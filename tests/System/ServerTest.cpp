@@ -6,6 +6,7 @@
 #include <regex>
 #include <sstream>
 
+#include "System/HeldFlash.h"
 #include "System/RunningDaemon.h"
 
 namespace {
@@ -46,6 +47,26 @@ TEST_F(Server, UpdatesAndKeepsTheJob) {
     EXPECT_EQ(quenxctl({"delete", jobs[0]["id"]}).status, 0);
     EXPECT_EQ(quenxctl({"delete", jobs[0]["id"]}).status, 1);
     EXPECT_TRUE(nlohmann::json::parse(quenxctl({"jobs", "--json"}).out)["jobs"].empty());
+}
+
+TEST_F(Server, SaysWhoHoldsTheAdapters) {
+    const std::string flash = daemon_.folder() / "state/eth0";
+    test::HeldFlash held(flash);
+    std::vector<std::string> install = {"install", "--target", "eth0",
+                                        image_,    "--cacert", daemon_.folder() / "cert.pem"};
+    Program first(command(install), Program::Output::Pipes, {"QUENXCTL_PASSWORD=admin"});
+    ASSERT_TRUE(held.isWaitedFor());
+    const auto expectRefusal = [&](const std::string& adapter, const std::string& part) {
+        const std::string error = quenxctl({"install", "--target", adapter, image_}).error;
+        EXPECT_TRUE(contains(error, part)) << error;
+    };
+    expectRefusal("eth0", "eth0 is being updated: Quenx:FirmwareUpdate@Job#1, ");
+    expectRefusal("eth1", "eth0 is being updated: Quenx:FirmwareUpdate@Job#1, ");
+    const std::string deleted = quenxctl({"delete", "Quenx:FirmwareUpdate@Job#1"}).out;
+    EXPECT_TRUE(contains(deleted, "The update goes on to its end and can no longer be followed")) << deleted;
+    EXPECT_TRUE(contains(first.finish().error, "The job was deleted by somebody."));
+    expectRefusal("eth0", "No job is running, yet the server holds eth0 for an earlier check, or ");
+    expectRefusal("eth1", "or it holds another adapter than eth1 for an earlier check, or ");
 }
 
 /// The lines in an order that says nothing, without where the instances are.
