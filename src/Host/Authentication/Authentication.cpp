@@ -22,8 +22,8 @@ AuthenticationResult Authentication::authenticate(const std::optional<std::strin
     if (!credentials) return {AuthenticationOutcome::Missing, {}};
     std::optional<Identity> identity = m_cache.find(*credentials);
     if (!identity) {
-        const auto turn = m_delays.admit(address);
-        if (!turn || !m_stop.sleepUntil(*turn)) return {AuthenticationOutcome::Busy, {}};
+        // Whoever guesses passwords shall not keep those out who share the address and know theirs.
+        if (!m_cache.knows(*credentials) && !waitForTurn(address)) return {AuthenticationOutcome::Busy, {}};
         const Slots::Use check(m_checks, kWaitForCheck);
         if (!check) return {AuthenticationOutcome::Busy, {}};
         identity = checkNow(*credentials, address);
@@ -33,15 +33,22 @@ AuthenticationResult Authentication::authenticate(const std::optional<std::strin
             *identity};
 }
 
+bool Authentication::waitForTurn(const std::string& address) {
+    const auto turn = m_delays.admit(address);
+    return turn && m_stop.sleepUntil(*turn);
+}
+
 std::optional<Identity> Authentication::checkNow(const Credentials& credentials, const std::string& address) {
     // Several requests may have come with the same credentials while the first of them was checked.
     std::optional<Identity> identity = m_cache.find(credentials);
     if (identity) return identity;
     identity = m_checker->check(credentials, address);
     if (identity) {
-        m_delays.succeeded(address);
+        // One who did not have to wait says nothing about the others there.
+        if (!m_cache.knows(credentials)) m_delays.succeeded(address);
         m_cache.remember(credentials, *identity);
     } else {
+        m_cache.forget(credentials);
         m_delays.failed(address);
         QUENX_ERROR("wrong user or password \"%s\" from %s", credentials.user.c_str(), address.c_str());
     }
@@ -49,8 +56,8 @@ std::optional<Identity> Authentication::checkNow(const Credentials& credentials,
 }
 
 void Authentication::reload() {
-    m_cache.clear();
     m_checker->reload();
+    m_cache.clear();
 }
 
 void Authentication::stop() {

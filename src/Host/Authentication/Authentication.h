@@ -25,22 +25,23 @@ struct AuthenticationResult {
 };
 
 /// Who sends a request. Credentials verified a short while ago are accepted at once; others are checked, a
-/// few at a time, and attempts from an address that has sent wrong ones wait. The wait is the calling
-/// connection's own and takes nobody else's place. Thread-safe.
+/// few at a time, and attempts from an address that has sent wrong ones wait, but for credentials that were
+/// right before. The wait is the calling connection's own and takes nobody else's place. Thread-safe.
 class Authentication {
   public:
     Authentication(std::unique_ptr<PasswordChecker> checker, std::chrono::seconds rememberFor);
 
     AuthenticationResult authenticate(const std::optional<std::string>& header, const std::string& address);
 
-    /// Forgets verified credentials and reads the users again. Throws std::runtime_error when that fails; the
-    /// users are then as before.
+    /// Reads the users again and forgets verified credentials. Throws std::runtime_error when that fails; all
+    /// is then as before.
     void reload();
 
     /// Lets go of everybody who waits, and refuses whoever would.
     void stop();
 
   private:
+    bool waitForTurn(const std::string& address);
     std::optional<Identity> checkNow(const Credentials& credentials, const std::string& address);
 
     std::unique_ptr<PasswordChecker> m_checker;

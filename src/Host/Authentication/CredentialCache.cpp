@@ -3,6 +3,7 @@
 #include <gnutls/crypto.h>
 #include <gnutls/gnutls.h>
 
+#include <algorithm>
 #include <stdexcept>
 
 namespace host {
@@ -42,19 +43,28 @@ CredentialCache::Digest CredentialCache::digestOf(const Credentials& credentials
 std::optional<Identity> CredentialCache::find(const Credentials& credentials) {
     const utils::Mutex::AutoLocker lock(m_mutex);
     const auto found = m_entries.find(digestOf(credentials));
-    if (found == m_entries.end()) return std::nullopt;
-    if (found->second.expires > Clock::now()) return found->second.identity;
-    m_entries.erase(found);
-    return std::nullopt;
+    if (found == m_entries.end() || found->second.expires <= Clock::now()) return std::nullopt;
+    return found->second.identity;
+}
+
+bool CredentialCache::knows(const Credentials& credentials) {
+    const utils::Mutex::AutoLocker lock(m_mutex);
+    return m_entries.contains(digestOf(credentials));
 }
 
 void CredentialCache::remember(const Credentials& credentials, const Identity& identity) {
-    if (m_rememberFor.count() == 0) return;
     const utils::Mutex::AutoLocker lock(m_mutex);
-    const auto now = Clock::now();
-    std::erase_if(m_entries, [now](const auto& each) { return each.second.expires <= now; });
-    if (m_entries.size() >= kMostEntries) return;
-    m_entries[digestOf(credentials)] = {identity, now + m_rememberFor};
+    if (m_entries.size() >= kMostEntries) {
+        m_entries.erase(std::min_element(
+            m_entries.begin(), m_entries.end(),
+            [](const auto& a, const auto& b) { return a.second.expires < b.second.expires; }));
+    }
+    m_entries[digestOf(credentials)] = {identity, Clock::now() + m_rememberFor};
+}
+
+void CredentialCache::forget(const Credentials& credentials) {
+    const utils::Mutex::AutoLocker lock(m_mutex);
+    m_entries.erase(digestOf(credentials));
 }
 
 }  // namespace host

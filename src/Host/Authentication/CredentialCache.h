@@ -12,14 +12,19 @@
 namespace host {
 
 /// Remembers for a short while whose credentials were right, since checking a password costs tens of
-/// milliseconds and clients send it with every request. Keeps no password: only a keyed hash (HMAC-SHA-256)
-/// under a key of this process. Thread-safe.
+/// milliseconds and clients send it with every request; and for good which ones were, so that those need not
+/// wait with the ones that somebody guesses. Keeps no password: only a keyed hash (HMAC-SHA-256) under a key
+/// of this process, of the thousand credentials last seen. Thread-safe.
 class CredentialCache {
   public:
     explicit CredentialCache(std::chrono::seconds rememberFor);
 
+    /// Nothing when they were never right, or too long ago.
     std::optional<Identity> find(const Credentials& credentials);
+    /// Whether they were right once.
+    bool knows(const Credentials& credentials);
     void remember(const Credentials& credentials, const Identity& identity);
+    void forget(const Credentials& credentials);
     /// Forgets everything and takes a new key.
     void clear();
 
