@@ -34,6 +34,11 @@ class Retirement {
 
     static bool waits(const CimInstance* instance) { return instance->m_destructionWaits; }
 
+    bool isWorking() noexcept {
+        const std::lock_guard lock(m_mutex);
+        return (m_first != nullptr && startThread()) || m_busy;
+    }
+
     void add(CimInstance* instance) noexcept {
         {
             const std::lock_guard lock(m_mutex);
@@ -114,6 +119,10 @@ void prepareRetirement() {
 
 void drainRetired() noexcept {
     Retirement::theOne().drain();
+}
+
+bool isRetiring() noexcept {
+    return Retirement::theOne().isWorking();
 }
 
 }  // namespace core

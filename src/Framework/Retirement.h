@@ -17,6 +17,9 @@ void prepareRetirement();
 /// Returns when every instance retired so far is destroyed, code of its library included.
 QUENX_EXPORT void drainRetired() noexcept;
 
+/// Whether the thread still has instances to destroy.
+QUENX_EXPORT bool isRetiring() noexcept;
+
 /// The deleter of listed instances.
 struct InstanceRelease {
     void operator()(CimInstance* instance) const noexcept { retireInstance(instance); }

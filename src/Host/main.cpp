@@ -52,7 +52,6 @@ void serve(host::Daemon& daemon, const Signals& signals) {
         host::ServiceManager::reloading();
         daemon.reload();
         host::ServiceManager::ready("serving " + daemon.places());
-        host::report("read certificate and users again");
     }
 }
 

@@ -105,6 +105,7 @@ TEST(DaemonTest, AnswersMistakesByTheirStatus) {
         {"gc", "Unknown", {}, "(6) CIM_ERR_NOT_FOUND"},
         {"gi", "Quenx_ConcreteJob.InstanceID=\"none\"", {}, "(6) CIM_ERR_NOT_FOUND"},
         {"di", service, {}, "(7) CIM_ERR_NOT_SUPPORTED"},
+        {"di", "Quenx_RegisteredProfile.InstanceID=\"none\"", {}, "(6) CIM_ERR_NOT_FOUND"},
         {"mi", service, {"Caption=\"x\""}, "(7) CIM_ERR_NOT_SUPPORTED"},
         {"ci", "Quenx_ConcreteJob.InstanceID=\"x\"", {"InstanceID=\"x\""}, "(7) CIM_ERR_NOT_SUPPORTED"},
         {"cm", service, {"InstallFromURI.InstallOptions=5"}, "(1) CIM_ERR_FAILED: "},
@@ -159,7 +160,10 @@ TEST(DaemonTest, IsDiscoveredFromTheInteropNamespace) {
         EXPECT_FALSE(daemon.lines("gc", name).empty()) << name;
 }
 
-TEST(DaemonTest, LetsAFlashEndBeforeItStops) {
+class StoppingTest : public ::testing::TestWithParam<bool> {};
+
+TEST_P(StoppingTest, LetsAFlashEndBeforeItStops) {
+    const bool isDeleted = GetParam();
     // A socket stands in for the service manager.
     const test::TempFolder folder;
     const std::string path = folder / "notify";
@@ -171,9 +175,13 @@ TEST(DaemonTest, LetsAFlashEndBeforeItStops) {
 
     RunningDaemon daemon({}, {"NOTIFY_SOCKET=" + path});
     test::HeldFlash flash(daemon.folder() / "state/eth0");
-    ASSERT_TRUE(reaches(daemon, startUpdate(daemon), "4"));
+    const std::string job = startUpdate(daemon);
+    ASSERT_TRUE(reaches(daemon, job, "4"));
+    if (isDeleted) daemon.lines("di", job);
     daemon.program().send(SIGTERM);
-    ASSERT_TRUE(daemon.program().waitFor("waiting for the flash of Quenx:FirmwareUpdate@Job#1 at "));
+    ASSERT_TRUE(daemon.program().waitFor(isDeleted
+                                             ? "waiting for the flash of a job that was deleted"
+                                             : "waiting for the flash of Quenx:FirmwareUpdate@Job#1 at "));
     daemon.program().send(SIGTERM);
     EXPECT_TRUE(daemon.program().waitFor("asked again to stop"));
     flash.release();
@@ -190,6 +198,8 @@ TEST(DaemonTest, LetsAFlashEndBeforeItStops) {
         EXPECT_TRUE(contains(told, part)) << told;
 }
 
+INSTANTIATE_TEST_SUITE_P(OfJobs, StoppingTest, ::testing::Bool());
+
 TEST(DaemonTest, ReadsUsersAndCertificateAgain) {
     RunningDaemon daemon;
     const RunningDaemon other;
@@ -202,8 +212,9 @@ TEST(DaemonTest, ReadsUsersAndCertificateAgain) {
     EXPECT_FALSE(isServed("later", false));
     std::filesystem::rename(daemon.folder() / "cert.pem", daemon.folder() / "old.pem");
     daemon.program().send(SIGHUP);
-    ASSERT_TRUE(daemon.program().waitFor("the certificate stays as it was"));
-    ASSERT_TRUE(daemon.program().waitFor("read certificate and users again"));
+    ASSERT_TRUE(daemon.program().waitFor("the certificate and key stay as they were"));
+    ASSERT_TRUE(contains(daemon.program().seen(), "read the users again"));
+    EXPECT_FALSE(contains(daemon.program().seen(), "read the certificate"));
     EXPECT_TRUE(isServed("later", false));
     std::filesystem::rename(daemon.folder() / "old.pem", daemon.folder() / "cert.pem");
     EXPECT_TRUE(isServed("admin", true));

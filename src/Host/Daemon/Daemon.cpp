@@ -2,6 +2,7 @@
 
 #include <iostream>
 
+#include "Framework/Retirement.h"
 #include "Host/Authentication/PamChecker.h"
 #include "Host/Authentication/UsersFile.h"
 #include "Host/Daemon/RunningJobs.h"
@@ -89,31 +90,33 @@ void Daemon::listenOn(std::uint16_t port, bool tls) {
     m_server->listen(std::move(listener), tls);
 }
 
+void Daemon::readIdentity() {
+    m_server->setIdentity(
+        std::make_shared<const TlsIdentity>(m_settings.tls.certificate, m_settings.tls.key));
+}
+
 void Daemon::listen() {
     if (m_settings.listen.https) {
         if (makeTlsFiles(m_settings.tls.certificate, m_settings.tls.key)) {
             report("made a self-signed certificate: " + m_settings.tls.certificate);
         }
-        m_server->setIdentity(
-            std::make_shared<const TlsIdentity>(m_settings.tls.certificate, m_settings.tls.key));
+        readIdentity();
         listenOn(m_settings.listen.httpsPort, true);
     }
     if (m_settings.listen.http) listenOn(m_settings.listen.httpPort, false);
 }
 
 void Daemon::reload() {
-    try {
-        m_authentication->reload();
-    } catch (const std::runtime_error& error) {
-        reportProblem(std::string("the users stay as they were: ") + error.what());
-    }
-    if (!m_settings.listen.https) return;
-    try {
-        m_server->setIdentity(
-            std::make_shared<const TlsIdentity>(m_settings.tls.certificate, m_settings.tls.key));
-    } catch (const std::runtime_error& error) {
-        reportProblem(std::string("the certificate stays as it was: ") + error.what());
-    }
+    const auto again = [](const std::string& what, const auto& read) {
+        try {
+            read();
+            report("read the " + what + " again");
+        } catch (const std::exception& error) {
+            reportProblem("the " + what + " stay as they were: " + error.what());
+        }
+    };
+    again("users", [this] { m_authentication->reload(); });
+    if (m_settings.listen.https) again("certificate and key", [this] { readIdentity(); });
 }
 
 void Daemon::stopAccepting() {
@@ -126,7 +129,8 @@ std::string Daemon::unfinished() {
     }
     m_dispatcher->shutDown();
     const std::vector<RunningJob> jobs = runningJobs(core::CimRequests(m_namespace));
-    return jobs.empty() ? "" : "the flash of " + describe(jobs);
+    if (!jobs.empty()) return "the flash of " + describe(jobs);
+    return core::isRetiring() ? "the flash of a job that was deleted" : "";
 }
 
 }  // namespace host

@@ -26,7 +26,8 @@ class Daemon {
     /// Where it listens, for a person: "https://127.0.0.1:5989".
     const std::string& places() const { return m_places; }
 
-    /// Reads certificate, key and users again. What cannot be read is reported, and stays as it was.
+    /// Reads certificate, key and users again, and reports what it has read. What cannot be read stays as it
+    /// was.
     void reload();
 
     /// Takes no more connections.
@@ -39,6 +40,7 @@ class Daemon {
     void loadProviders();
     std::unique_ptr<Dispatcher> makeDispatcher() const;
     std::unique_ptr<Authentication> makeAuthentication() const;
+    void readIdentity();
     void listen();
     void listenOn(std::uint16_t port, bool tls);
 
