@@ -91,6 +91,7 @@ void CimRequests::deleteInstance(CimPath path) const {
                            "the deletion of " + path.toString() + " ended with code " + std::to_string(code));
         }
         if (supported) throw CimError(CimStatus::NotFound, path.toString() + " names no instance");
+        requireInstance(*m_broker, path);
         throw CimError(CimStatus::NotSupported, "instances of " + path.getClassName() + " cannot be deleted");
     });
 }

@@ -23,6 +23,8 @@ std::vector<core::CimPath> readReferences(const pugi::xml_node& element, KeyTypi
 }
 
 std::optional<core::CimScalar> parseOne(core::CimType type, const std::string& text) {
+    // A path written as a text would be guessed at: a reference has an element of its own.
+    if (type == core::CimType::Reference) return std::nullopt;
     return core::parseScalar(type, text);
 }
 
