@@ -163,7 +163,7 @@ void addAssociators(CLI::App& app, Arguments& arguments) {
 }
 
 void addDelete(CLI::App& app, Arguments& arguments) {
-    CLI::App* verb = app.add_subcommand("delete", "Delete a job on a server");
+    CLI::App* verb = app.add_subcommand("delete", "Delete a job on a server; its update goes on");
     auto job = std::make_shared<std::string>();
     verb->add_option("job", *job, "Job, as \"jobs\" lists it")->type_name("JOB")->required();
     verb->callback(

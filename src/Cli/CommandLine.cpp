@@ -47,6 +47,7 @@ std::string adviceFor(core::CimStatus status) {
     switch (status) {
         case core::CimStatus::InvalidClass:
             return "\"quenxctl mof\" prints the classes that are served.";
+        case core::CimStatus::InvalidParameter:
         case core::CimStatus::NotFound:
             return "\"quenxctl instances CLASS --names\" prints the paths of what there is.";
         case core::CimStatus::AccessDenied:

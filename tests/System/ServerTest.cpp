@@ -3,7 +3,6 @@
 
 #include <algorithm>
 #include <nlohmann/json.hpp>
-#include <regex>
 #include <sstream>
 
 #include "System/HeldFlash.h"
@@ -69,9 +68,9 @@ TEST_F(Server, SaysWhoHoldsTheAdapters) {
     expectRefusal("eth1", "or it holds another adapter than eth1 for an earlier check, or ");
 }
 
-/// The lines in an order that says nothing, without where the instances are.
+/// The lines in an order that says nothing.
 std::vector<std::string> comparable(const std::string& text) {
-    std::istringstream stream(std::regex_replace(text, std::regex("(//[^/]*/)?root/cimv2:"), ""));
+    std::istringstream stream(text);
     std::vector<std::string> lines;
     for (std::string line; std::getline(stream, line);)
         lines.push_back(line);
