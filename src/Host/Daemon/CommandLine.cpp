@@ -38,6 +38,7 @@ void addOptions(CLI::App& app, std::vector<GivenOption>& given) {
                       ".* of the file)");
         if (each.field.isFlag()) option->expected(0, 1)->default_str("true");
         if (!each.field.isList() && !each.field.isFlag()) option->expected(1);
+        option->type_name(each.field.isFlag() ? "BOOL" : each.field.isText() ? "TEXT" : "NUMBER");
     }
 }
 
