@@ -9,10 +9,6 @@
 #include "Cli/Failure.h"
 #include "MidAPI/ma.h"
 
-#ifndef QUENX_PROVIDER_DIR
-#define QUENX_PROVIDER_DIR "/usr/lib/quenx"
-#endif
-
 namespace cli {
 
 namespace fs = std::filesystem;
@@ -24,15 +20,6 @@ void requireReadable(const std::string& file, const std::string& what) {
     const std::string reason = std::generic_category().message(errno);
     throw Failure(ExitStatus::WrongUse, "Cannot read the " + what + " " + file + ": " + reason + ".",
                   "Name a file that exists and that you may read.");
-}
-
-/// Beside the program as it is built and unpacked, else where it is installed.
-std::string defaultProviderDirectory() {
-    std::error_code error;
-    const fs::path program = fs::read_symlink("/proc/self/exe", error);
-    const fs::path beside = program.parent_path().parent_path() / "lib";
-    if (!error && fs::exists(beside / "libQuenx_SoftwareUpdate.so", error)) return beside.string();
-    return QUENX_PROVIDER_DIR;
 }
 
 void selectAdapters(const LocalSettings& settings) {
@@ -83,7 +70,7 @@ LocalManagement::LocalManagement(const LocalSettings& settings) {
     }
     selectAdapters(settings);
     if (settings.providerDirectory.empty()) {
-        loadProviders(providers_, defaultProviderDirectory(), ExitStatus::Failed);
+        loadProviders(providers_, core::ProviderLibraries::defaultDirectory(), ExitStatus::Failed);
     } else {
         loadProviders(providers_, settings.providerDirectory, ExitStatus::WrongUse);
     }

@@ -29,7 +29,21 @@ std::vector<std::filesystem::path> librariesIn(const std::string& directory) {
     return files;
 }
 
+/// The loader's words for its latest failure, without the file, which it names first when it can.
+std::string loaderReason(const std::string& file) {
+    const char* text = dlerror();
+    const std::string reason = text == nullptr ? "unknown reason" : text;
+    return reason.starts_with(file + ": ") ? reason.substr(file.size() + 2) : reason;
+}
+
 }  // namespace
+
+std::string ProviderLibraries::defaultDirectory() {
+    Dl_info own{};
+    dladdr(PREFIX, &own);
+    std::error_code error;
+    return std::filesystem::weakly_canonical(own.dli_fname, error).parent_path().string();
+}
 
 void ProviderLibraries::Close::operator()(void* handle) const {
     dlclose(handle);
@@ -43,10 +57,10 @@ ProviderLibraries::~ProviderLibraries() {
 void ProviderLibraries::load(const std::string& directory) {
     for (const std::filesystem::path& file : librariesIn(directory)) {
         // An absolute path: a name without a slash would send the loader to its own search path.
-        Handle handle(dlopen(std::filesystem::absolute(file).c_str(), LOAD_FLAGS));
+        const std::string path = std::filesystem::absolute(file).string();
+        Handle handle(dlopen(path.c_str(), LOAD_FLAGS));
         if (handle == nullptr) {
-            const char* reason = dlerror();
-            problems_.push_back({file.string(), reason == nullptr ? "unknown reason" : reason});
+            problems_.push_back({file.string(), loaderReason(path)});
             continue;
         }
         handles_.push_back(std::move(handle));

@@ -19,6 +19,9 @@ class QUENX_EXPORT ProviderLibraries {
         std::string reason;
     };
 
+    /// Where the libraries of this build are, providers among them: the directory of the framework's own.
+    static std::string defaultDirectory();
+
     ProviderLibraries() = default;
     ~ProviderLibraries();
     ProviderLibraries(const ProviderLibraries&) = delete;

@@ -11,6 +11,7 @@
 #include "Host/Daemon/Daemon.h"
 #include "Host/Daemon/LockFile.h"
 #include "Host/Daemon/PasswdCommand.h"
+#include "Host/Daemon/Report.h"
 #include "Host/Daemon/ServiceManager.h"
 
 namespace {

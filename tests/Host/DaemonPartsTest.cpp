@@ -123,11 +123,17 @@ TEST(ConfigCheckTest, LooksAtEveryFile) {
         std::string key;
         Words more;
     } table[] = {
+        // First: with a sanitizer the providers stay where they are loaded.
+        {2, certificate, key, {"--providers-directory", folder.path()}},
+        {2, certificate, key, {"--providers-directory", "/nonexistent"}},
         {0, certificate, key, {}},
         {0, folder / "none", folder / "none", {}},
+        {2, certificate, key, {"--listen-address", "localhost"}},
+        {2, certificate, key, {"--daemon-lock-file", "/nonexistent/lock"}},
         {2, certificate, key, {"--auth-method", "users", "--auth-users-file", "/nonexistent"}},
         {2, certificate, key, {"--providers-configuration", "/nonexistent"}},
         {2, certificate, key, {"--adapters-description", "/nonexistent", "--adapters-state", "/tmp"}},
+        {2, certificate, key, {"--adapters-description", junk, "--adapters-state", "/tmp"}},
         {2, certificate, otherKey, {}},
         {2, certificate, junk, {}},
         {2, certificate, folder / "none", {}},
@@ -135,7 +141,7 @@ TEST(ConfigCheckTest, LooksAtEveryFile) {
         {2, key, key, {}},
     };
     for (const auto& row : table) {
-        Words arguments{"--config", folder.write("config", ""), "--providers-directory", folder.path()};
+        Words arguments{"--config", folder.write("config", "")};
         arguments.insert(arguments.end(), {"--tls-certificate", row.certificate, "--tls-key", row.key});
         arguments.insert(arguments.end(), row.more.begin(), row.more.end());
         EXPECT_EQ(host::checkConfiguration(read(arguments).settings), row.status) << &row - table;

@@ -230,6 +230,29 @@ TEST(DaemonTest, ReadsUsersAndCertificateAgain) {
     EXPECT_EQ(daemon.stop().status, 0);
 }
 
+TEST(DaemonTest, RunsWhereItIsInstalled) {
+    const test::TempFolder place;
+    const std::string prefix = place / "new/prefix";
+    ASSERT_EQ(test::run({CMAKE, "--install", QUENX_BUILD, "--strip", "--prefix", prefix}).status, 0);
+    const std::string config = place.write("config", "[listen]\nhttps = false\nhttp = true\n");
+    const ProgramResult checked =
+        test::run({prefix + "/sbin/quenx-cimd", "--check-config", "--config", config});
+    EXPECT_EQ(checked.status, 0) << checked.error;
+    EXPECT_EQ(test::run({prefix + "/bin/quenxctl", "mof"}).status, 0);
+    for (const auto& file : std::filesystem::recursive_directory_iterator(prefix)) {
+        if (!file.is_regular_file()) continue;
+        const auto bytes = test::readTestFile(file.path().string());
+        EXPECT_FALSE(contains({bytes.begin(), bytes.end()}, QUENX_BUILD "/lib")) << file.path();
+    }
+    // The users file, too, has a directory that is not there yet.
+    const std::string users = place / "etc/users";
+    EXPECT_EQ(test::run({"/bin/sh", "-c", "echo x | \"$0\" passwd ann --users " + users,
+                         prefix + "/sbin/quenx-cimd"})
+                  .status,
+              0);
+    EXPECT_TRUE(std::filesystem::exists(users));
+}
+
 TEST(DaemonTest, NamesWhatKeepsItFromServing) {
     const test::TempFolder folder;
     folder.write("libQuenx_Broken.so", "no library");

@@ -8,6 +8,7 @@
 #include <algorithm>
 #include <cerrno>
 #include <cstring>
+#include <filesystem>
 #include <fstream>
 #include <sstream>
 #include <stdexcept>
@@ -54,7 +55,11 @@ UserEntry readEntry(const std::string& path, std::size_t number, const std::stri
 /// The file's owner and mode decide who can let himself in.
 void checkMode(const std::string& path) {
     struct stat status {};
-    if (::stat(path.c_str(), &status) != 0) fail(path, std::strerror(errno));
+    if (::stat(path.c_str(), &status) != 0) {
+        fail(path,
+             std::strerror(errno) +
+                 (errno == ENOENT ? "; make it with `quenx-cimd passwd --users " + path + " NAME`" : ""));
+    }
     if (!S_ISREG(status.st_mode)) fail(path, "is no regular file");
     if ((status.st_mode & 077U) != 0) fail(path, "is open to group or others; chmod 600 it");
     if (status.st_uid != 0 && status.st_uid != ::geteuid()) {
@@ -91,15 +96,17 @@ void writeUsersFile(const std::string& path, const UserEntries& users) {
     for (const auto& [name, entry] : users) {
         text += name + ":" + entry.hash + ":" + (entry.isAdministrator ? "admin" : "reader") + "\n";
     }
+    std::error_code error;
+    std::filesystem::create_directories(std::filesystem::path(path).parent_path(), error);
     const std::string fresh = path + ".new";
     ::unlink(fresh.c_str());
     const int fd = ::open(fresh.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0600);
     if (fd < 0) fail(fresh, std::strerror(errno));
     const bool written =
         ::write(fd, text.data(), text.size()) == static_cast<ssize_t>(text.size()) && ::fsync(fd) == 0;
-    const int error = errno;
+    const int reason = errno;
     ::close(fd);
-    if (!written) fail(fresh, std::strerror(error));
+    if (!written) fail(fresh, std::strerror(reason));
     if (::rename(fresh.c_str(), path.c_str()) != 0) fail(path, std::strerror(errno));
 }
 

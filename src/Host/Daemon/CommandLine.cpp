@@ -3,9 +3,9 @@
 #include <unistd.h>
 
 #include <CLI/CLI.hpp>
-#include <filesystem>
 #include <iostream>
 
+#include "Framework/ProviderLibraries.h"
 #include "Host/Daemon/SettingsField.h"
 
 namespace host {
@@ -14,15 +14,6 @@ namespace {
 
 constexpr const char* kDefaultFile = "/etc/quenx-cimd/quenx-cimd.toml";
 constexpr int kWrongUse = 2;
-
-/// Beside the program as it is built and unpacked, else where it is installed.
-std::string providerDirectory() {
-    std::error_code error;
-    const auto beside =
-        std::filesystem::read_symlink("/proc/self/exe", error).parent_path().parent_path() / "lib";
-    return std::filesystem::exists(beside / "libQuenx_SoftwareUpdate.so", error) ? beside.string()
-                                                                                 : QUENX_PROVIDER_DIR;
-}
 
 /// The texts given for a setting; empty when its option was not used.
 struct GivenOption {
@@ -64,7 +55,7 @@ void readFile(const std::string& named, Settings& settings) {
 
 CommandLine readCommandLine(int argc, const char* const* argv) {
     CommandLine result;
-    result.settings.providers = providerDirectory();
+    result.settings.providers = core::ProviderLibraries::defaultDirectory();
     CLI::App app(
         "Serves firmware updates of Ethernet adapters over CIM-XML.\n"
         "SIGTERM: take no more requests, answer those in flight, wait for flashes that have begun,\n"
@@ -82,6 +73,7 @@ CommandLine readCommandLine(int argc, const char* const* argv) {
 
     PasswdRequest passwd;
     CLI::App* command = app.add_subcommand("passwd", "Set the password of a user in the users file.");
+    command->fallthrough();
     command->add_option("USER", passwd.user, "name of the user")->required();
     command->add_option("--users", passwd.usersFile, "the file [auth.users_file]");
     command->add_flag("--reader", passwd.isReader, "may read only");
@@ -99,6 +91,7 @@ CommandLine readCommandLine(int argc, const char* const* argv) {
     }
     if (command->parsed()) {
         if (passwd.usersFile.empty()) passwd.usersFile = result.settings.authentication.usersFile;
+        passwd.isAsked = result.settings.authentication.method == "users";
         result.passwd = passwd;
     }
     return result;

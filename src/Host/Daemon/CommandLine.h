@@ -13,6 +13,7 @@ struct PasswdRequest {
     std::string user;
     bool isReader = false;
     bool remove = false;
+    bool isAsked = false;  ///< whether the configuration has the daemon ask a users file
 };
 
 /// What the command line asks for.

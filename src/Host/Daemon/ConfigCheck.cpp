@@ -8,7 +8,11 @@
 #include <stdexcept>
 
 #include "Host/Authentication/UsersFile.h"
+#include "Host/Daemon/Providers.h"
+#include "Host/Server/Listener.h"
 #include "Host/Server/TlsIdentity.h"
+#include "MidAPI/Simulator/Simulator.h"
+#include "MidAPI/ma.h"
 
 namespace host {
 
@@ -25,13 +29,35 @@ void checkTls(const TlsSettings& settings) {
     if (hasCertificate) TlsIdentity(settings.certificate, settings.key);
 }
 
-void requireDirectory(const std::string& path) {
-    if (!fs::is_directory(path)) throw std::runtime_error(path + ": is no directory");
-}
-
 void requireReadable(const std::string& path) {
     if (!path.empty() && ::access(path.c_str(), R_OK) != 0)
         throw std::runtime_error(path + ": cannot be read");
+}
+
+void checkAdapters(const Settings& settings) {
+    if (settings.adapters.empty()) {
+        ma::enumerateAdapters();
+    } else {
+        ma::Simulator(settings.adapters, settings.adapterState);
+    }
+}
+
+void checkLockFile(const std::string& file) {
+    const fs::path directory = fs::absolute(file).parent_path();
+    if (!fs::is_directory(directory)) {
+        throw std::runtime_error("daemon.lock_file is " + file + ", but there is no directory " +
+                                 directory.string());
+    }
+}
+
+void checkAuthentication(const AuthenticationSettings& settings) {
+    constexpr const char* kService = "/etc/pam.d/quenx-cimd";
+    if (settings.method == "users") {
+        readUsersFile(settings.usersFile);
+    } else if (!fs::exists(kService)) {
+        std::cerr << "quenx-cimd: note: " << kService
+                  << " is missing, so PAM goes by its service \"other\"\n";
+    }
 }
 
 }  // namespace
@@ -46,13 +72,16 @@ int checkConfiguration(const Settings& settings) {
             status = 2;
         }
     };
+    check([&] { Listener::checkAddress(settings.listen.address); });
     if (settings.listen.https) check([&] { checkTls(settings.tls); });
-    if (settings.authentication.method == "users") {
-        check([&] { readUsersFile(settings.authentication.usersFile); });
-    }
-    check([&] { requireDirectory(settings.providers); });
+    check([&] { checkAuthentication(settings.authentication); });
     check([&] { requireReadable(settings.providerConfiguration); });
-    check([&] { requireReadable(settings.adapters); });
+    check([&] {
+        core::ProviderLibraries providers;
+        loadProviders(providers, settings.providers);
+    });
+    check([&] { checkAdapters(settings); });
+    check([&] { checkLockFile(settings.lockFile); });
     if (status == 0) std::cout << "The configuration is good.\n";
     return status;
 }

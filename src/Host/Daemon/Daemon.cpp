@@ -1,42 +1,22 @@
 #include "Host/Daemon/Daemon.h"
 
-#include <iostream>
-
 #include "Framework/Retirement.h"
 #include "Host/Authentication/PamChecker.h"
 #include "Host/Authentication/UsersFile.h"
+#include "Host/Daemon/Providers.h"
+#include "Host/Daemon/Report.h"
 #include "Host/Daemon/RunningJobs.h"
 #include "Host/Operations/InteropNamespace.h"
 #include "Host/Operations/ProviderNamespace.h"
 #include "MidAPI/ma.h"
-#include "Utils/Log.h"
 #include "Utils/Os/Linux/linux.h"
 
 namespace host {
 
-namespace {
-
-/// One write, so that lines of several threads do not mix.
-void say(const std::string& text) {
-    std::cerr << "quenx-cimd: " + text + "\n";
-}
-
-}  // namespace
-
-void report(const std::string& text) {
-    say(text);
-    QUENX_DEBUG_TEXT(text);
-}
-
-void reportProblem(const std::string& text) {
-    say(text);
-    QUENX_ERROR_TEXT(text);
-}
-
 Daemon::Daemon(const Settings& settings) : m_settings(settings) {
     if (!m_settings.providerConfiguration.empty()) m_configuration.emplace(m_settings.providerConfiguration);
     if (!m_settings.adapters.empty()) ma::configureSimulator(m_settings.adapters, m_settings.adapterState);
-    loadProviders();
+    loadProviders(m_providers, m_settings.providers);
     m_namespace = utils::SMASHv2Config::getInstance()->getNamespace();
     m_dispatcher = makeDispatcher();
     m_authentication = makeAuthentication();
@@ -45,15 +25,6 @@ Daemon::Daemon(const Settings& settings) : m_settings(settings) {
 }
 
 Daemon::~Daemon() = default;
-
-void Daemon::loadProviders() {
-    m_providers.load(m_settings.providers);
-    for (const auto& problem : m_providers.problems()) {
-        reportProblem(problem.file + " is not loaded: " + problem.reason);
-    }
-    if (m_providers.loaded().empty())
-        reportProblem("there is no provider library in " + m_settings.providers);
-}
 
 std::unique_ptr<Dispatcher> Daemon::makeDispatcher() const {
     const auto implementation = std::make_shared<ProviderNamespace>(m_namespace);
@@ -98,7 +69,8 @@ void Daemon::readIdentity() {
 void Daemon::listen() {
     if (m_settings.listen.https) {
         if (makeTlsFiles(m_settings.tls.certificate, m_settings.tls.key)) {
-            report("made a self-signed certificate: " + m_settings.tls.certificate);
+            report("made a self-signed certificate for " + os::getHostname() +
+                   ", localhost and loopback: " + m_settings.tls.certificate);
         }
         readIdentity();
         listenOn(m_settings.listen.httpsPort, true);

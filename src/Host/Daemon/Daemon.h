@@ -16,7 +16,7 @@ namespace host {
 class Daemon {
   public:
     /// Throws std::runtime_error that says what is missing or wrong. A provider library that does not load is
-    /// only reported.
+    /// only reported, as long as there is another.
     explicit Daemon(const Settings& settings);
     /// Ends connections and unloads the providers, which wait for what they still do.
     ~Daemon();
@@ -37,7 +37,6 @@ class Daemon {
     std::string unfinished();
 
   private:
-    void loadProviders();
     std::unique_ptr<Dispatcher> makeDispatcher() const;
     std::unique_ptr<Authentication> makeAuthentication() const;
     void readIdentity();
@@ -55,9 +54,5 @@ class Daemon {
     std::unique_ptr<Authentication> m_authentication;
     std::unique_ptr<HttpServer> m_server;
 };
-
-/// Tells a person and the system log.
-void report(const std::string& text);
-void reportProblem(const std::string& text);
 
 }  // namespace host

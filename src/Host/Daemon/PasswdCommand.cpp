@@ -35,7 +35,8 @@ std::string newPassword() {
 
 void change(const PasswdRequest& request) {
     if (!isUserName(request.user)) {
-        throw std::runtime_error("a user name has no blank, colon or leading #, and 64 bytes at the most");
+        throw std::runtime_error(
+            "a user name has printable ASCII characters only, 64 at the most, no blank, colon or leading #");
     }
     UserEntries users;
     if (::access(request.usersFile.c_str(), F_OK) == 0) users = readUsersFile(request.usersFile);
@@ -49,6 +50,20 @@ void change(const PasswdRequest& request) {
         users[request.user] = {hashPassword(password), !request.isReader};
     }
     writeUsersFile(request.usersFile, users);
+    if (request.remove) {
+        std::cout << "Took " << request.user << " out of " << request.usersFile << ".\n";
+    } else {
+        std::cout << (request.isReader ? "Reader " : "Administrator ") << request.user << " is set in "
+                  << request.usersFile << ".\n";
+    }
+}
+
+void adviseAfter(const PasswdRequest& request) {
+    std::cout << "A running quenx-cimd takes this up by `systemctl reload quenx-cimd` (SIGHUP).\n";
+    if (!request.isAsked)
+        std::cout
+            << "Its configuration has it ask PAM instead; set method = \"users\" in [auth], or start it with "
+               "--auth-method users.\n";
 }
 
 }  // namespace
@@ -56,6 +71,7 @@ void change(const PasswdRequest& request) {
 int runPasswd(const PasswdRequest& request) {
     try {
         change(request);
+        adviseAfter(request);
         return 0;
     } catch (const std::runtime_error& error) {
         std::cerr << "quenx-cimd: " << error.what() << '\n';

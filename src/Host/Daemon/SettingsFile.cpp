@@ -9,7 +9,8 @@ namespace host {
 namespace {
 
 std::string placeOf(const std::string& file, const toml::source_region& source) {
-    return file + ":" + std::to_string(source.begin.line);
+    // A file that cannot be read has no line.
+    return source.begin.line == 0 ? file : file + ":" + std::to_string(source.begin.line);
 }
 
 std::string textOf(const toml::node& node, const std::string& place) {

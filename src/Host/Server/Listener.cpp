@@ -32,7 +32,9 @@ SocketAddress addressOf(const std::string& text, std::uint16_t port) {
         six->sin6_port = htons(port);
         address.length = sizeof *six;
     } else {
-        throw std::runtime_error("\"" + text + "\" is no IPv4 or IPv6 address to listen on");
+        throw std::runtime_error(
+            "\"" + text +
+            "\" is no IPv4 or IPv6 address to listen on; write one like 127.0.0.1, or 0.0.0.0 or :: for all");
     }
     return address;
 }
@@ -46,6 +48,10 @@ std::uint16_t portOf(int socket) {
 }
 
 }  // namespace
+
+void Listener::checkAddress(const std::string& address) {
+    addressOf(address, 0);
+}
 
 Listener::Listener(const std::string& address, std::uint16_t port) {
     const SocketAddress place = addressOf(address, port);

@@ -8,6 +8,9 @@ namespace host {
 /// A listening TCP socket, close-on-exec. Owns it until release().
 class Listener {
   public:
+    /// Throws std::runtime_error for a text that is no address to listen on.
+    static void checkAddress(const std::string& address);
+
     /// Port 0 takes any free one. Throws std::runtime_error that names address and port.
     Listener(const std::string& address, std::uint16_t port);
     ~Listener();

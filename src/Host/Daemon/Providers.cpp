@@ -1,0 +1,27 @@
+#include "Host/Daemon/Providers.h"
+
+#include <stdexcept>
+#include <system_error>
+
+#include "Framework/CimBroker.h"
+#include "Host/Daemon/Report.h"
+
+namespace host {
+
+void loadProviders(core::ProviderLibraries& providers, const std::string& directory) {
+    const std::string advice = "; providers.directory must name the directory of libQuenx_SoftwareUpdate.so";
+    try {
+        providers.load(directory);
+    } catch (const std::system_error& error) {
+        throw std::runtime_error(directory + ": " + error.code().message() + advice);
+    }
+    for (const auto& problem : providers.problems())
+        reportProblem(problem.file + " is not loaded: " + problem.reason);
+    std::string names;
+    for (const core::AgentUse& each : core::GetCimBroker()->useAgents())
+        names += (names.empty() ? "" : ", ") + each.agent().getProviderName();
+    if (names.empty()) throw std::runtime_error(directory + " has no provider library" + advice);
+    report("providers: " + names);
+}
+
+}  // namespace host
