@@ -230,6 +230,59 @@ TEST(DaemonTest, ReadsUsersAndCertificateAgain) {
     EXPECT_EQ(daemon.stop().status, 0);
 }
 
+TEST(DaemonTest, AsksPamAndTheGroupsOfTheSystem) {
+    const std::vector<std::string> unshare{"/usr/bin/unshare", "-m",      "--propagation",
+                                           "private",          "/bin/sh", "-c"};
+    const auto privately = [&](std::initializer_list<std::string> words) {
+        std::vector<std::string> command = unshare;
+        command.insert(command.end(), words);
+        return command;
+    };
+    if (test::run(privately({"mount --bind /etc /etc"})).status != 0)
+        GTEST_SKIP() << "nothing can be mounted";
+    // A system of its own: the users below, all with the password "secret".
+    const test::TempFolder etc;
+    const std::string hash =
+        "$6$quenxtest$.xlSksxRD.dejcRvfnG4BPvAFrzRVgFmpd5.PLjUWcskxPz5GZtukA9MFOf55EEozqmI15fR8UkYekJBjxiOL0";
+    std::string passwd, shadow;
+    int id = 0;
+    for (const char* name : {"root", "chief", "reader", "watcher", "other", "expired"}) {
+        const std::string number = std::to_string(id++);
+        passwd += std::string(name) + ":x:" + number + ":" + number + "::/:/bin/sh\n";
+        shadow += name + (":" + hash) +
+                  ":19000:0:99999:7::" + (name == std::string("expired") ? "19001" : "") + ":\n";
+    }
+    etc.write("passwd", passwd);
+    etc.write("shadow", shadow);
+    etc.write("group", "root:x:0:\nquenx-admin:x:101:chief\nwatchers:x:102:watcher\n");
+    std::filesystem::copy("/etc/pam.d", etc / "pam.d");
+    std::filesystem::copy(QUENX_PACKAGING_DIR "/pam.d", etc / "pam.d",
+                          std::filesystem::copy_options::overwrite_existing);
+    RunningDaemon daemon(
+        {"--auth-method", "pam", "--auth-readers", "reader", "@watchers"}, {},
+        privately({"for f in passwd shadow group pam.d; do mount --bind $0/$f /etc/$f; done; exec \"$@\"",
+                   etc.path()}));
+    const char* const kMayDelete = "(6) CIM_ERR_NOT_FOUND";
+    const char* const kMayRead = "(2) CIM_ERR_ACCESS_DENIED";
+    const char* const kForbidden = "HTTP response code said error";
+    const char* const kWrong = "Invalid username/password";
+    const struct {
+        const char* user;
+        const char* password;
+        const char* expected;
+    } table[] = {
+        {"root", "secret", kMayDelete},  {"chief", "secret", kMayDelete}, {"reader", "secret", kMayRead},
+        {"watcher", "secret", kMayRead}, {"other", "secret", kForbidden}, {"chief", "wrong", kWrong},
+        {"expired", "secret", kWrong},   {"unknown", "secret", kWrong},
+    };
+    for (const auto& row : table) {
+        daemon.user = row.user;
+        daemon.password = row.password;
+        const ProgramResult result = daemon.wbemcli("di", "Quenx_ConcreteJob.InstanceID=\"none\"");
+        EXPECT_TRUE(contains(result.error, row.expected)) << row.user << result.error;
+    }
+}
+
 TEST(DaemonTest, RunsWhereItIsInstalled) {
     const test::TempFolder place;
     const std::string prefix = place / "new/prefix";

@@ -11,13 +11,14 @@
 namespace test {
 
 RunningDaemon::RunningDaemon(const std::vector<std::string>& options,
-                             const std::vector<std::string>& environment) {
+                             const std::vector<std::string>& environment, std::vector<std::string> command) {
     setPassword("admin");
     setPassword("guest", {"--reader"});
-    m_folder.write("quenx-cimd.toml", "[listen]\nhttps_port = 0\nhttp = true\nhttp_port = 0\n");
+    m_folder.write("quenx-cimd.toml",
+                   "[listen]\nhttps_port = 0\nhttp = true\nhttp_port = 0\n[auth]\nmethod = 'users'\n");
     m_folder.write("provider.conf", "");
     m_folder.write("adapters.toml", TEST_ADAPTERS);
-    std::vector<std::string> command{QUENX_CIMD, "--auth-method", "users"};
+    command.push_back(QUENX_CIMD);
     const std::pair<const char*, const char*> files[] = {{"--config", "quenx-cimd.toml"},
                                                          {"--tls-certificate", "cert.pem"},
                                                          {"--tls-key", "key.pem"},

@@ -15,8 +15,10 @@ namespace test {
 class RunningDaemon {
   public:
     /// @param options  further ones, such as limits
+    /// @param command  what runs the daemon, for one that does not run by itself
     explicit RunningDaemon(const std::vector<std::string>& options = {},
-                           const std::vector<std::string>& environment = {});
+                           const std::vector<std::string>& environment = {},
+                           std::vector<std::string> command = {});
 
     int httpPort() const { return m_httpPort; }
     int httpsPort() const { return m_httpsPort; }
