@@ -1,11 +1,7 @@
 #include "InstantAdapters.h"
 
-#include <unistd.h>
-
-#include <filesystem>
-#include <fstream>
-
 #include "MidAPI/ma.h"
+#include "Support/TestRoms.h"
 #include "Utils/Log.h"
 
 namespace bench {
@@ -60,22 +56,17 @@ class InstantBackend : public ma::Backend {
     utils::StringArray m_names;
 };
 
-std::filesystem::path scratch(const char* name) {
-    return std::filesystem::temp_directory_path() / (std::string(name) + std::to_string(getpid()));
-}
-
 }  // namespace
 
 InstantAdapters::InstantAdapters(std::size_t ports)
-    : m_config("/nonexistent"), m_imageUri("file://" + scratch("quenx-bench-image-").string()) {
-    std::ofstream(m_imageUri.substr(7)) << std::string(1024, '\0');
+    : m_config(m_folder.write("provider.conf", "FWFilePath=" + m_folder.path() + "\n")),
+      m_imageUri("file://" + m_folder.write("image.rom", test::madeRom({{utils::FirmwareType::PXE, 2}}))) {
     utils::logLevel = 0;  // what is measured is not the system log
     m_previous = ma::setBackend(std::make_shared<InstantBackend>(ports));
 }
 
 InstantAdapters::~InstantAdapters() {
     ma::setBackend(m_previous);
-    std::filesystem::remove(m_imageUri.substr(7));
 }
 
 std::string InstantAdapters::portName(std::size_t index) {

@@ -4,6 +4,7 @@
 #include <string>
 
 #include "MidAPI/Backend.h"
+#include "Support/TempFolder.h"
 #include "Utils/Os/Linux/SMASHv2Config.h"
 
 namespace bench {
@@ -18,10 +19,11 @@ class InstantAdapters {
     InstantAdapters& operator=(const InstantAdapters&) = delete;
 
     static std::string portName(std::size_t index);
-    /// A one-kilobyte file that every adapter takes.
+    /// A one-kilobyte image, which every adapter takes and the inventory serves.
     const std::string& imageUri() const { return m_imageUri; }
 
   private:
+    test::TempFolder m_folder;
     utils::SMASHv2Config m_config;
     std::string m_imageUri;
     std::shared_ptr<ma::Backend> m_previous;

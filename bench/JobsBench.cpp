@@ -2,6 +2,7 @@
 #include <benchmark/benchmark.h>
 #include <malloc.h>
 
+#include "ColdCaches.h"
 #include "Framework/CimRequests.h"
 #include "InstantAdapters.h"
 #include "Providers/SoftwareUpdate/Quenx_ConcreteJobClass.h"
@@ -47,6 +48,7 @@ void report(benchmark::State& state, const Jobs& jobs) {
 void refreshAndEnumerate(benchmark::State& state) {
     const Jobs jobs(static_cast<std::size_t>(state.range(0)));
     for (auto _ : state) {
+        bench::emptyCaches(state);
         auto instances = core::GetCimBroker()->getInstances("Quenx_ConcreteJob", "Software Update");
         benchmark::DoNotOptimize(instances.size());
     }
@@ -57,8 +59,10 @@ void refreshAndEnumerate(benchmark::State& state) {
 void enumerateAsValues(benchmark::State& state) {
     const Jobs jobs(static_cast<std::size_t>(state.range(0)));
     const core::CimRequests requests("root/cimv2");
-    for (auto _ : state)
+    for (auto _ : state) {
+        bench::emptyCaches(state);
         benchmark::DoNotOptimize(requests.enumerateInstances("Quenx_ConcreteJob"));
+    }
     report(state, jobs);
 }
 

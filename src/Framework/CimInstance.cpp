@@ -85,6 +85,17 @@ std::vector<CimProperty*> CimInstance::getProperties() const {
     return select(shape().served);
 }
 
+std::shared_ptr<const CimPath> CimInstance::getPath() const {
+    const RecursiveLocker lock(m_mutex);
+    if (m_path == nullptr) m_path = std::make_shared<const CimPath>(CimPath::of(*this));
+    return m_path;
+}
+
+void CimInstance::forgetPath() const {
+    const RecursiveLocker lock(m_mutex);
+    m_path.reset();
+}
+
 std::vector<CimProperty*> CimInstance::getKeys() const {
     const RecursiveLocker lock(m_mutex);
     return select(shape().keys);
@@ -92,6 +103,7 @@ std::vector<CimProperty*> CimInstance::getKeys() const {
 
 void CimInstance::registerProperty(CimProperty* property) {
     const RecursiveLocker lock(m_mutex);
+    if (m_properties.empty()) m_properties.reserve(8);  // as many as most associations have
     m_properties.push_back(property);
     m_shape.reset();
 }

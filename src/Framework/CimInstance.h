@@ -62,6 +62,8 @@ class QUENX_EXPORT CimInstance : public std::enable_shared_from_this<CimInstance
     std::vector<CimProperty*> getKeys() const;
     /// Every registered property, repeated names included, in the order of construction.
     const std::vector<CimProperty*>& getAllProperties() const { return m_properties; }
+    /// CimPath::of() this instance, found once and shared until a key changes.
+    std::shared_ptr<const CimPath> getPath() const;
     /// The most derived class that has said what it is; null when none has.
     const CimClassInfo* getClassInfo() const { return m_classInfo; }
 
@@ -96,11 +98,14 @@ class QUENX_EXPORT CimInstance : public std::enable_shared_from_this<CimInstance
     void registerMethod(std::string name, Method method);
     void registerProperty(CimProperty* property);
     void unregisterProperty(CimProperty* property) noexcept;
+    /// When a key has changed.
+    void forgetPath() const;
 
     mutable RecursiveMutex m_mutex;
     std::vector<CimProperty*> m_properties;
     mutable std::shared_ptr<const PropertyShape> m_shape
         QUENX_GUARDED_BY(m_mutex);  ///< found at the first use
+    mutable std::shared_ptr<const CimPath> m_path QUENX_GUARDED_BY(m_mutex);
     std::vector<std::pair<std::string, Method>> m_methods;
     const CimClassInfo* m_classInfo = nullptr;
     std::weak_ptr<InstanceListLink> m_list;  ///< set once, when the instance is added

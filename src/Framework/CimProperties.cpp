@@ -51,8 +51,9 @@ CimPropertyString::CimPropertyString(const char* name, CimInstance* owner)
 
 CimPropertyString& CimPropertyString::operator=(std::string value) {
     const Guard guard(*this);
+    if (!isNull() && m_value == value) return *this;
     m_value = std::move(value);
-    m_null = false;
+    changed();
     return *this;
 }
 
@@ -67,7 +68,7 @@ CimPropertyString& CimPropertyString::operator=(CimPropertyString& other) {
 
 std::string CimPropertyString::get() const {
     const Guard guard(*this);
-    return m_null ? std::string() : m_value;
+    return isNull() ? std::string() : m_value;
 }
 
 void CimPropertyString::setLengthBounds(std::size_t shortest, std::size_t longest) {

@@ -38,14 +38,15 @@ class CimPropertyScalar : public CimProperty {
 
     CimPropertyScalar& operator=(T value) {
         const Guard guard(*this);
+        if (!isNull() && m_value == value) return *this;
         m_value = std::move(value);
-        m_null = false;
+        changed();
         return *this;
     }
     /// T() when null.
     T get() const {
         const Guard guard(*this);
-        return m_null ? empty() : m_value;
+        return isNull() ? empty() : m_value;
     }
 
   protected:
@@ -77,25 +78,25 @@ class CimPropertyArray : public CimProperty {
 
     void push_back(T value) {
         const Guard guard(*this);
-        if (m_null) m_values.clear();
+        if (isNull()) m_values.clear();
         m_values.push_back(std::move(value));
-        m_null = false;
+        changed();
     }
     void clear() {
         const Guard guard(*this);
         m_values.clear();
-        m_null = false;
+        changed();
     }
     CimPropertyArray& operator=(std::vector<T> values) {
         const Guard guard(*this);
         m_values = std::move(values);
-        m_null = false;
+        changed();
         return *this;
     }
     /// Empty when null.
     std::vector<T> get() const {
         const Guard guard(*this);
-        return m_null ? std::vector<T>() : m_values;
+        return isNull() ? std::vector<T>() : m_values;
     }
 
   protected:

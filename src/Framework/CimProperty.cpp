@@ -100,7 +100,12 @@ void CimProperty::verify(CimProperty* requested) {
 
 void CimProperty::setNull() {
     const Guard guard(*this);
-    m_null = true;
+    changed(true);
+}
+
+void CimProperty::changed(bool isNull) {
+    m_null = isNull;
+    if (m_key && m_owner != nullptr) m_owner->forgetPath();
 }
 
 bool CimProperty::IsNull() const {
@@ -119,7 +124,7 @@ void CimProperty::setValue(const CimValue& value) {
     const CimValue held = converted(*this, m_type, value);
     const Guard guard(*this);
     if (!held.isNull()) store(held);
-    m_null = held.isNull();
+    changed(held.isNull());
 }
 
 void CimProperty::addListener(Listener* listener) {

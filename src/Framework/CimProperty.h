@@ -83,11 +83,14 @@ class QUENX_EXPORT CimProperty {
         const CimInstance* m_owner;
     };
 
-    bool m_null = true;  ///< under the owner's lock
+    /// Both under the owner's lock. To be called after each change of the value.
+    bool isNull() const { return m_null; }
+    void changed(bool isNull = false);
 
   private:
     void check(const CimProperty& requested) const;
 
+    bool m_null = true;  ///< under the owner's lock
     bool m_key = false;
     bool m_array;
     CimType m_type;

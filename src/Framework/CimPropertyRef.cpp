@@ -25,19 +25,20 @@ void CimPropertyRef::verify(CimProperty* requested) {
 
 CimPath CimPropertyRef::getPath() const {
     const Guard guard(*this);
-    return m_null ? CimPath() : m_path;
+    return isNull() ? CimPath() : *m_path;
 }
 
 void CimPropertyRef::setPath(CimPath path) {
+    auto shared = std::make_shared<const CimPath>(std::move(path));
     const Guard guard(*this);
-    m_path = std::move(path);
+    m_path = std::move(shared);
     m_target.reset();
-    m_null = false;
+    changed();
 }
 
 std::shared_ptr<CimInstance> CimPropertyRef::getInstance() const {
     const Guard guard(*this);
-    return m_null ? nullptr : m_target.lock();
+    return isNull() ? nullptr : m_target.lock();
 }
 
 void CimPropertyRef::assign(const CimInstance* target) {
@@ -46,20 +47,20 @@ void CimPropertyRef::assign(const CimInstance* target) {
         return;
     }
     // Read the target before locking the owner: two instances are never locked at once.
-    CimPath path = CimPath::of(*target);
+    auto path = target->getPath();
     auto hold = std::const_pointer_cast<CimInstance>(target->weak_from_this().lock());
     const Guard guard(*this);
     m_path = std::move(path);
     m_target = hold;
-    m_null = false;
+    changed();
 }
 
 void CimPropertyRef::load(CimValue& value) const {
-    value.data = CimScalar(m_path);
+    value.data = CimScalar(*m_path);
 }
 
 void CimPropertyRef::store(const CimValue& value) {
-    m_path = std::get<CimPath>(*value.scalar());
+    m_path = std::make_shared<const CimPath>(std::get<CimPath>(*value.scalar()));
     m_target.reset();
 }
 

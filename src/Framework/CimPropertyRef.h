@@ -35,7 +35,7 @@ class QUENX_EXPORT CimPropertyRef : public CimProperty {
     void store(const CimValue& value) override;
 
   private:
-    CimPath m_path;
+    std::shared_ptr<const CimPath> m_path;
     std::weak_ptr<CimInstance> m_target;
 };
 
