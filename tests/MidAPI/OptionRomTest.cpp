@@ -21,21 +21,6 @@ void mend(Rom& image) {
     image[ma::rom::HEADER_CHECKSUM] = static_cast<uint8_t>(image[ma::rom::HEADER_CHECKSUM] - sum);
 }
 
-TEST(OptionRom, readsRealImages) {
-    for (const auto& [file, ids] : {std::pair("efi-virtio", "1af4:1041"), {"efi-pcnet", "1022:2000"}}) {
-        const ma::RomFile rom = ma::parseOptionRom(test::realRom(file));
-        ASSERT_FALSE(rom.error) << file << ": " << *rom.error;
-        for (const ma::RomImage& image : rom.images) {
-            EXPECT_EQ(ids, ma::formatIds(image.vendorId, image.deviceId));
-            EXPECT_TRUE(image.isNetwork());
-        }
-        EXPECT_EQ("iPXE", rom.images[0].product);
-        EXPECT_EQ("http://ipxe.org", rom.images[0].manufacturer);
-        EXPECT_EQ(1U, rom.images[0].furtherDeviceIds.size());
-        EXPECT_EQ("IMG_PXE 1, IMG_UEFI 0", test::describeComponents(rom.components()));
-    }
-}
-
 TEST(OptionRom, tellsTypesByCodeProductAndClpEntry) {
     EXPECT_EQ("IMG_CLP 7, IMG_PXE 7", test::describeRom(test::madeRom({{CLP, 7}})));
     EXPECT_EQ("IMG_iSCSI 2, IMG_UEFI 3, IMG_FCoE 1",
@@ -116,31 +101,6 @@ TEST(OptionRom, everyTruncationOfARealImageIsAnError) {
         cut.shrink_to_fit();  // its own block: ASan sees
         EXPECT_TRUE(ma::parseOptionRom(cut).error) << length;
     }
-}
-
-TEST(OptionRomWriter, composesAValidChainOfAnyChoice) {
-    const Rom file = test::realRom("efi-virtio");
-    const ma::RomFile rom = ma::parseOptionRom(file);
-    const auto compose = [&](const std::vector<std::size_t>& choice) {
-        std::vector<std::span<const uint8_t>> parts;
-        for (const std::size_t index : choice)
-            parts.push_back(ma::imageBytes(file, rom.images[index]));
-        Rom output(file.size());
-        output.resize(ma::composeOptionRom(parts, output));
-        return output;
-    };
-    EXPECT_EQ(file, compose({0, 1}));
-    const ma::RomFile turned = ma::parseOptionRom(compose({1, 0}));
-    ASSERT_FALSE(turned.error) << *turned.error;
-    EXPECT_EQ(FirmwareType::UEFI, turned.images.at(0).type);
-    EXPECT_EQ(FirmwareType::PXE, turned.images.at(1).type);
-    EXPECT_FALSE(ma::parseOptionRom(compose({0})).error);
-    EXPECT_EQ(file, ma::mergeOptionRoms({}, file));
-    EXPECT_EQ(file, ma::mergeOptionRoms(file, file));
-
-    const Rom changed = test::withRevision(file, 0x1234);
-    EXPECT_EQ("IMG_PXE 4660, IMG_UEFI 4660", test::describeRom(changed));
-    EXPECT_FALSE(ma::parseOptionRom(changed).error);
 }
 
 }  // namespace

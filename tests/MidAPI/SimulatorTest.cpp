@@ -29,47 +29,6 @@ test::WriteResult install(const std::string& adapter, const Rom& file, std::vect
     return test::writeImage(adapter, prepared.image);
 }
 
-TEST(Simulator, tellsWhatTheDescriptionSays) {
-    const test::SimulatedAdapters adapters;
-    EXPECT_TRUE(ma::getPCIAddress("eth0").sameAdapter(ma::getPCIAddress("eth1")));
-    EXPECT_FALSE(ma::getPCIAddress("eth0").sameAdapter(ma::getPCIAddress("eth2")));
-    EXPECT_FALSE(ma::getCanBeUpdated("eth3"));
-    const std::array<uint8_t, 6> mac{0x52, 0x54, 0, 0, 0, 0x10};
-    EXPECT_EQ(mac, ma::getAdapterInfo("eth0").permanentMac);
-    EXPECT_FALSE(std::filesystem::exists(adapters.stateDirectory())) << "reading must not write";
-}
-
-TEST(Simulator, unknownAdaptersAreRefused) {
-    const test::SimulatedAdapters adapters;
-    uint32_t code = 0;
-    std::string text;
-    EXPECT_THROW(ma::getPCIAddress("eth9"), ma::AdapterError);
-    EXPECT_THROW(ma::getAdapterInfo("eth9"), ma::AdapterError);
-    EXPECT_FALSE(ma::getCanBeUpdated("eth9"));
-    EXPECT_EQ("unreadable", test::componentsOf("eth9"));
-    EXPECT_EQ(0, ma::getFlashImageUpdateProgress("eth9"));
-    EXPECT_FALSE(ma::setBootType("eth9", ma::BootType::None));
-    EXPECT_FALSE(ma::updateCapabilityWord("eth9", {PXE}, code, text));
-    EXPECT_EQ(ma::ERROR_UNKNOWN_ADAPTER, code);
-    EXPECT_EQ("there is no adapter eth9", test::writeImage("eth9", {}).text);
-}
-
-TEST(Simulator, anUpdateReplacesItsTypesAndIsReadBackByAll) {
-    test::SimulatedAdapters adapters;
-    ma::Simulator other(adapters.descriptionFile(), adapters.stateDirectory());
-    const Rom newer = test::withRevision(test::realRom("efi-virtio"), 7);
-    const test::WriteResult result = install("eth0", newer);
-    EXPECT_TRUE(result.done && result.code == 0 && result.text.empty()) << result.text;
-    EXPECT_EQ("IMG_PXE 7, IMG_UEFI 7", test::componentsOf("eth0"));
-    EXPECT_EQ("IMG_PXE 1, IMG_UEFI 0", test::componentsOf("eth1")) << "each function has its own flash";
-    EXPECT_EQ(newer, other.flashContent("eth0"));
-    EXPECT_TRUE(install("eth0", test::madeRom({{PXE, 5}, {UEFI, 6}}), {PXE}).done);
-    EXPECT_TRUE(install("eth0", test::madeRom({{iSCSI, 2}})).done);
-    adapters.restart();
-    EXPECT_EQ("IMG_iSCSI 2, IMG_PXE 5, IMG_UEFI 7", test::componentsOf("eth0"));
-    EXPECT_EQ(adapters->flashContent("eth0"), other.flashContent("eth0"));
-}
-
 TEST(Simulator, capabilityWordAndBootTypeAreKept) {
     test::SimulatedAdapters adapters;
     uint32_t code = 9;
@@ -182,12 +141,13 @@ TEST(Simulator, progressMovesOnlyForward) {
     EXPECT_LT(15, std::set<uint16_t>(files->seen.begin(), files->seen.end()).size());
     EXPECT_EQ(99, files->seen.back()) << "100 only when it is in force";
 
-    simulator->injectFault("eth0", {.percent = 50, .code = 1, .text = "worn out"});
+    simulator->injectFault("eth0", {.percent = 50, .code = 1, .text = "worn out", .once = true});
     EXPECT_EQ(0, test::prepareImage("eth0", test::realRom("pxe-virtio")).status);
     EXPECT_EQ(0, ma::getFlashImageUpdateProgress("eth0"));
     EXPECT_FALSE(test::writeImage("eth0", prepared.image).done);
     const uint16_t reached = ma::getFlashImageUpdateProgress("eth0");
     EXPECT_TRUE(reached >= 49 && reached < 60) << reached;
+    EXPECT_TRUE(test::writeImage("eth0", prepared.image).done);
     ma::setBackend(previous);
 }
 
@@ -238,6 +198,23 @@ TEST(Backend, isChosenByCallThenEnvironment) {
     ::unsetenv("QUENX_ADAPTERS");
     ::unsetenv("QUENX_ADAPTER_STATE");
     ma::setBackend(mine);
+}
+
+TEST(Backend, answersUntilTheProcessHasEnded) {
+    // As a provider that is still loaded then: its destructor waits for the flash that runs.
+    const auto provider = [] {
+        if (ma::enumerateAdapters().size() != 5 || !install("eth0", test::madeRom({{PXE, 9}})).done)
+            ::_exit(1);
+    };
+    const test::TempFolder folder;
+    const std::string description = folder.write("adapters.toml", test::TEST_ADAPTERS);
+    EXPECT_EXIT(
+        {
+            std::atexit(provider);
+            ma::configureSimulator(description, folder / "state");
+            std::exit(0);
+        },
+        testing::ExitedWithCode(0), "");
 }
 
 }  // namespace

@@ -39,7 +39,7 @@ class FaultTableTest : public test::UpdateTest {
     std::function<void()> strike(const std::string& operation, On on, How how);
     /// Has the adapter itself fail.
     std::function<void()> order(ma::Operation at, Fault::Action action, uint16_t percent = 0) {
-        return [=, this] { m_adapters->injectFault("eth4", Fault{at, action, percent, 17, "on order"}); };
+        return [=, this] { m_adapters->injectFault("eth4", Fault{at, action, percent, 17, "on order", 30}); };
     }
     void run(const Row& row, bool releases);
     void disarm();
@@ -85,6 +85,7 @@ std::vector<FaultTableTest::Row> FaultTableTest::table() {
     };
     std::vector<Row> rows = {
         // New: the image is being verified.
+        {"no adapters", order(Operation::Enumerate, Action::Fail), 5},
         {"target look-up", strike("enumerateAdapters", On::Request, How::Throw), 5},
         {"preparation throws", strike("prepareFlashImage", On::Request, How::Throw), 2, 0, 0, "", "", true},
         {"preparation stalls", strike("prepareFlashImage", On::Request, How::Stall), kJobStarted, 7},
@@ -97,8 +98,9 @@ std::vector<FaultTableTest::Row> FaultTableTest::table() {
         {"version fails", order(Operation::FirmwareVersion, Action::Fail), kJobStarted, 7},
         {"boot type fails", order(Operation::BootType, Action::Fail), kJobStarted, 7},
         {"write fails at once", order(Operation::Write, Action::Fail), kJobStarted, 10, 17, "on order"},
-        {"write fails late", order(Operation::Write, Action::Fail, 90), kJobStarted, 10, 17, "on order"},
+        {"write fails late", order(Operation::Write, Action::Fail, 100), kJobStarted, 10, 17, "on order"},
         {"write throws late", order(Operation::Write, Action::Throw, 50), kJobStarted, 10, 4, timeout},
+        {"write stalls", order(Operation::Write, Action::Stall, 50), kJobStarted, 7},
         {"write loses power", order(Operation::Write, Action::PowerLoss, 50), kJobStarted, 10, 4, timeout},
         {"word fails", order(Operation::CapabilityWord, Action::Fail), kJobStarted, 10, 17, "on order"},
         {"word fails widely", answered(false, 0x10005), kJobStarted, 10, 5, "answered"},

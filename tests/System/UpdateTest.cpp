@@ -125,8 +125,9 @@ TEST_F(Update, ASecondProcessIsToldWhoHoldsTheAdapter) {
     ASSERT_TRUE(flash.isWaitedFor());
     const ProgramResult second = test::run(install());
     EXPECT_EQ(second.status, 1) << second.out;
-    EXPECT_TRUE(contains(second.error, std::to_string(first.id()))) << second.error;
-    EXPECT_TRUE(contains(second.error, "The update of eth0 failed: ")) << second.error;
+    const std::string reason = "The update of eth0 failed: adapter eth0 is being written to by process ";
+    EXPECT_TRUE(contains(second.error, reason + std::to_string(first.id()))) << second.error;
+    EXPECT_EQ(firmwareOf("eth0"), OLD) << "readers do not wait";
     EXPECT_EQ(test::run(install("eth1")).status, 0) << "another port is free";
     flash.release();
     EXPECT_EQ(first.finish().status, 0);

@@ -56,6 +56,7 @@ TEST_F(Ports, ShowWhatTheAdapterSaysOfItself) {
             "05:00; 2; 2; 05:00, 1022:2000, 1022:2000, Not Supported",
             "06:00; 2; 2; 06:00, 15ad:07b0, 15ad:07b0, Supported",
         }));
+    EXPECT_FALSE(std::filesystem::exists(m_adapters.stateDirectory())) << "reading must not write";
 }
 
 TEST_F(Ports, StayTheSameObjectsWhileTheAdaptersDo) {
@@ -79,11 +80,8 @@ TEST_F(Ports, StayTheSameObjectsWhileTheAdaptersDo) {
 }
 
 TEST_F(Ports, ThatDoNotAnswerHideNoOthers) {
-    m_backend->hook = [](const std::string& operation, const std::string& adapter) {
-        const bool isUnwell = (operation == "getAdapterInfo" && adapter == "eth0") ||
-                              (operation == "getPCIAddress" && adapter == "eth2");
-        if (isUnwell) throw ma::AdapterError("No answer from " + adapter + ".");
-    };
+    m_adapters->injectFault("eth0", {.at = ma::Operation::Info});
+    m_adapters->injectFault("eth2", {.at = ma::Operation::PciAddress});
     EXPECT_EQ(table("Quenx_EthernetPort", {"Name", "PermanentAddress", "Speed", "EnabledState", "HealthState",
                                            "OtherIdentifyingInfo"}),
               (Rows{
