@@ -31,10 +31,7 @@ class DispatcherTest : public ::testing::Test {
     DispatcherTest()
         : m_dispatcher({std::make_shared<host::ProviderNamespace>("root/cimv2")},
                        {2, std::chrono::seconds(60), std::chrono::seconds(100)}) {
-        auto* a = m_agent.add("a", 1);
-        auto* b = m_agent.add("b", 2);
-        m_agent.add("c", 3);
-        m_agent.links().instances.add(new test::Link(*a, *b));
+        m_agent.links().instances.add(new test::Link(m_a, m_b));
     }
 
     cimxml::Response answer(std::variant<cimxml::IntrinsicCall, cimxml::MethodCall> call) {
@@ -71,7 +68,8 @@ class DispatcherTest : public ::testing::Test {
         return answer(cimxml::MethodCall{method, object, isClass, std::move(arguments)});
     }
 
-    static std::string output(const IntrinsicResult& result, const std::string& name) {
+    template <class Result>
+    static std::string output(const Result& result, const std::string& name) {
         for (const core::Argument& each : result.outputs) {
             if (each.name == name) return core::scalarText(each.value.type, *each.value.scalar());
         }
@@ -81,6 +79,9 @@ class DispatcherTest : public ::testing::Test {
     std::string m_namespace = "root/cimv2";
     host::Caller m_caller{"admin", true, "localhost"};
     test::GadgetAgent m_agent;
+    test::Gadget& m_a = *m_agent.add("a", 1);
+    test::Gadget& m_b = *m_agent.add("b", 2);
+    test::Gadget& m_c = *m_agent.add("c", 3);
     host::Dispatcher m_dispatcher;
 };
 
@@ -111,6 +112,14 @@ TEST_F(DispatcherTest, ReadsInstancesAndTheirNeighbours) {
     const auto names = call("ReferenceNames", {{"ObjectName", a}}).paths;
     ASSERT_EQ(names.size(), 1U);
     EXPECT_TRUE(names[0].names(call("GetInstance", {{"InstanceName", link()}}).instances.at(0).path));
+
+    // However many instances are at the far ends, their class is enumerated once.
+    m_agent.links().instances.add(new test::Link(m_c, m_a));
+    m_agent.links().instances.add(new test::Link(m_a, m_b));  // the same again
+    const int before = m_agent.gadgets().enumerations;
+    EXPECT_EQ(call("Associators", {{"ObjectName", a}}).instances.size(), 2U);
+    EXPECT_EQ(m_agent.gadgets().enumerations, before + 1);
+    EXPECT_EQ(call("References", {{"ObjectName", a}}).instances.size(), 2U);
 }
 
 TEST_F(DispatcherTest, AnswersEachMistakeByItsStatus) {
@@ -198,11 +207,15 @@ TEST_F(DispatcherTest, CallsMethods) {
     const auto numbers = [](std::vector<std::string> values) {
         return cimxml::RawArgument{"Numbers", {{}, std::move(values), false}};
     };
-    const cimxml::Response response = invoke(a, "work", {numbers({"5", " 0x10 "}), text});
+    // What is given for an output reaches the method, but the job is the method's own.
+    const cimxml::RawArgument echo{"ECHO", {{}, std::string("given "), false}};
+    const cimxml::RawArgument job{"Job", {{}, gadget("b", "2"), false}};
+    const cimxml::Response response = invoke(a, "work", {numbers({"5", " 0x10 "}), text, echo, job});
     const auto& result = std::get<cimxml::ExtrinsicResult>(response.content).result;
     EXPECT_EQ(response.name, "work");
     EXPECT_EQ(result.returnValue, 21U);
-    EXPECT_EQ(result.outputs.size(), 2U);
+    EXPECT_EQ(output(result, "Echo"), "given hello");
+    EXPECT_EQ(output(result, "Job"), "root/cimv2:Test_Gadget.ID=\"a\",Number=1");
     // One element of an array may come alone, and an optional input may be left out.
     EXPECT_EQ(statusIn(invoke(a, "Work", {text, {"Numbers", {{}, std::string("7"), false}}})), 0);
     EXPECT_EQ(statusIn(invoke(a, "Work", {text})), 0);
