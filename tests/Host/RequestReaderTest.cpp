@@ -44,25 +44,6 @@ TEST(RequestReaderTest, ReadsWhatClientsSend) {
     held<std::monostate>(open, "FilterQuery");
 }
 
-TEST(RequestReaderTest, ReadsMethodCallsWithAndWithoutTypes) {
-    const Request untyped = cimxml::readRequest(test::readSample("w-InstallFromURI.xml"));
-    const auto& call = std::get<cimxml::MethodCall>(untyped.call);
-    EXPECT_EQ(call.object.getNamespace(), "root/cimv2");
-    EXPECT_FALSE(call.isClass);
-    ASSERT_EQ(call.arguments.size(), 3U);
-    EXPECT_EQ(std::get<std::string>(call.arguments[0].value.data), "file:///opt/x.rom");
-    EXPECT_EQ(std::get<std::vector<std::string>>(call.arguments[1].value.data),
-              (std::vector<std::string>{"5", "3"}));
-    EXPECT_EQ(std::get<core::CimPath>(call.arguments[2].value.data).toString(),
-              "//127.0.0.1/root/cimv2:Quenx_EthernetPort.DeviceID=\"eth0\"");
-
-    const Request typed = cimxml::readRequest(test::readSample("p-InstallFromURI.xml"));
-    const auto& arguments = std::get<cimxml::MethodCall>(typed.call).arguments;
-    ASSERT_EQ(arguments.size(), 4U);
-    EXPECT_EQ(arguments[2].value.type, core::CimType::Uint16);
-    EXPECT_TRUE(arguments[3].value.isNull());
-}
-
 /// The call inside an envelope that is right.
 std::string wrapped(const std::string& call) {
     return "<CIM CIMVERSION=\"2.3\" DTDVERSION=\"2.1\"><MESSAGE ID=\"1\" "
