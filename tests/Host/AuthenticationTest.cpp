@@ -10,7 +10,7 @@
 
 #include "Host/Authentication/PamChecker.h"
 #include "Host/Authentication/UsersFile.h"
-#include "Support/ChildProcess.h"
+#include "Support/Nobody.h"
 #include "Support/TempFolder.h"
 
 namespace {
@@ -60,7 +60,12 @@ TEST(UsersFileTest, SaysWhatIsWrongWithAFile) {
     ::chmod(file.c_str(), 0640);
     EXPECT_NE(problem(file).find("chmod 600"), std::string::npos);
     ::chmod(file.c_str(), 0600);
-    EXPECT_EQ(test::runAsNobody([&] { return problem(file).empty() ? "read a file of root's" : ""; }), "");
+    EXPECT_EXIT(
+        {
+            test::becomeNobody();
+            _exit(problem(file).empty() ? 1 : 0);
+        },
+        testing::ExitedWithCode(0), "");
     EXPECT_NE(problem(folder / "missing").find("missing: "), std::string::npos);
     EXPECT_NE(problem(folder.path()).find("no regular file"), std::string::npos);
     const std::string hash = host::hashPassword("x");

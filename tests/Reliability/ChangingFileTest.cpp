@@ -113,7 +113,7 @@ TEST_F(ChangingFileTest, OddPathsAreRefusedOrReadLikeAnyOther) {
     const std::string huge = m_folder.write("huge", std::string_view("x"));
     const std::string larger = m_folder.write("larger", std::string_view("x"));
     fs::resize_file(huge, 1ULL << 31);
-    fs::resize_file(larger, 5ULL << 30);
+    fs::resize_file(larger, (1ULL << 32) + 5);
     mkfifo((m_folder / "fifo").c_str(), 0600);
     const std::string good = goodImage();
     for (const std::string& uri : {

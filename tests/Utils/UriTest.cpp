@@ -3,7 +3,6 @@
 #include <gtest/gtest.h>
 
 #include "Support/SyslogCapture.h"
-#include "Support/TempFolder.h"
 
 using utils::Uri;
 using Scheme = Uri::SupportedURISchemes;
@@ -46,9 +45,4 @@ TEST(Uri, TextsGiveSchemePathAndLogLine) {
     uri.parseUri("nonsense");
     EXPECT_FALSE(uri.IsUriSupported());
     EXPECT_EQ(uri.getSourcePath(), "/x");
-    const test::TempFolder folder;
-    const std::string file = folder.write("a:b.rom", "x");
-    EXPECT_TRUE(Uri("file://" + file).IsUriAccesible());
-    EXPECT_FALSE(Uri("file://" + folder.path()).IsUriAccesible());
-    EXPECT_FALSE(Uri("https://" + file).IsUriAccesible());
 }

@@ -8,7 +8,6 @@
 #include <cerrno>
 #include <functional>
 #include <stdexcept>
-#include <thread>
 #include <vector>
 
 #include "Support/SyslogCapture.h"
@@ -126,22 +125,4 @@ TEST_F(ThreadTest, AThreadThatDestroysItselfIsNotJoinedByItself) {
     isStarted = true;
     waitUntil([&] { return isGone.load(); });
     EXPECT_EQ(SyslogCapture::count(formatStr("join status is %d", EDEADLK)), 1U);
-}
-
-TEST(Atomic, OneOfManyTakesTheClaim) {
-    utils::Atomic<std::string> claim;
-    std::atomic<int> taken{0};
-    std::vector<std::thread> threads;
-    for (int i = 0; i < 8; ++i) {
-        threads.emplace_back([&, name = "adapter " + std::to_string(i)] {
-            std::string holder;
-            taken += claim.compareAndSet("", name, holder) ? 1 : 0;
-        });
-    }
-    for (std::thread& thread : threads)
-        thread.join();
-    EXPECT_EQ(taken, 1);
-    EXPECT_FALSE(claim == "");
-    claim = "";
-    EXPECT_TRUE(claim == "");
 }
