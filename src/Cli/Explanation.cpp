@@ -95,7 +95,7 @@ Explanation find(const Management& management, std::uint32_t returnValue, const 
 }  // namespace
 
 Explanation explainRefusal(Management& management, std::uint32_t returnValue, const Candidate& candidate) {
-    const Explanation busy = explainBusyness(management, returnValue, candidate);
+    Explanation busy = explainBusyness(management, returnValue, candidate);
     if (!busy.message.empty()) return busy;
     const ReturnValueText& general = returnValueText(returnValue);
     const Explanation found = find(management, returnValue, candidate);

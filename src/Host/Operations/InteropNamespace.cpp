@@ -71,6 +71,7 @@ InstanceValue InteropNamespace::relocated(InstanceValue instance) const {
 
 std::vector<CimPath> InteropNamespace::relocated(const std::vector<CimPath>& paths) const {
     std::vector<CimPath> moved;
+    moved.reserve(paths.size());
     for (const CimPath& path : paths)
         moved.push_back(relocated(path));
     return moved;
