@@ -21,14 +21,14 @@ std::string readLine() {
 std::string ask(const char* prompt) {
     const os::EchoOff hidden;
     std::cerr << prompt << std::flush;
-    const std::string line = readLine();
+    std::string line = readLine();
     std::cerr << '\n';
     return line;
 }
 
 std::string newPassword() {
     if (::isatty(STDIN_FILENO) == 0) return readLine();
-    const std::string password = ask("New password: ");
+    std::string password = ask("New password: ");
     if (ask("Again: ") != password) throw std::runtime_error("the two passwords differ");
     return password;
 }

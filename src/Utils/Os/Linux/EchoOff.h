@@ -39,8 +39,8 @@ class EchoOff {
     /// What was typed of a password is not left to the program that reads next.
     static void restoreAndEnd(int number) {
         tcsetattr(STDIN_FILENO, TCSAFLUSH, &s_saved);
-        signal(number, SIG_DFL);
-        raise(number);
+        (void)signal(number, SIG_DFL);
+        (void)raise(number);
     }
 
     static void replace(int number, struct sigaction& before) {
