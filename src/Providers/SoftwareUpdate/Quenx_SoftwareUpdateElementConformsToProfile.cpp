@@ -10,16 +10,12 @@
 
 namespace {
 
-void associate(const CIM_RegisteredProfile& profile, core::InstanceRange& services, Rebuild& rebuilt) {
-    for (const core::CimInstance* each : services) {
-        const auto* service = dynamic_cast<const CIM_SoftwareInstallationService*>(each);
-        if (service == nullptr) continue;
-        QUENX_DEBUG("['%s']", service->Name.get().c_str());
-        auto conformance = std::make_unique<Quenx_SoftwareUpdateElementConformsToProfile>();
-        conformance->ConformantStandard = &profile;
-        conformance->ManagedElement = service;
-        rebuilt.add(std::move(conformance));
-    }
+std::unique_ptr<core::CimInstance> conformanceOf(const CIM_SoftwareInstallationService& service,
+                                                 const CIM_RegisteredProfile& profile) {
+    auto conformance = std::make_unique<Quenx_SoftwareUpdateElementConformsToProfile>();
+    conformance->ConformantStandard = &profile;
+    conformance->ManagedElement = &service;
+    return conformance;
 }
 
 }  // namespace
@@ -52,7 +48,13 @@ Quenx_SoftwareUpdateElementConformsToProfileClass::getInstances() {
         if (profile == nullptr) continue;
         const std::string id = profile->InstanceID.get();
         QUENX_DEBUG("['%s']", id.c_str());
-        if (id == ProfileName::SoftwareUpdate) associate(*profile, services, rebuilt);
+        if (id != ProfileName::SoftwareUpdate) continue;
+        for (const core::CimInstance* other : services) {
+            const auto* service = dynamic_cast<const CIM_SoftwareInstallationService*>(other);
+            if (service == nullptr) continue;
+            QUENX_DEBUG("['%s']", service->Name.get().c_str());
+            rebuilt.add(conformanceOf(*service, *profile));
+        }
     }
     rebuilt.publish();
     QUENX_DEBUG("return %d", static_cast<int>(m_instances.size()));
