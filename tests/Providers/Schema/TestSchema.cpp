@@ -6,51 +6,22 @@
 #include <set>
 #include <sstream>
 
+#include "Framework/CimBroker.h"
 #include "Framework/ClassDeclaration.h"
-#include "Providers/Schema/CIM_AffectedJobElement.h"
-#include "Providers/Schema/CIM_ConcreteJob.h"
-#include "Providers/Schema/CIM_Controller.h"
-#include "Providers/Schema/CIM_ElementCapabilities.h"
-#include "Providers/Schema/CIM_ElementConformsToProfile.h"
-#include "Providers/Schema/CIM_ElementSoftwareIdentity.h"
-#include "Providers/Schema/CIM_EthernetPort.h"
-#include "Providers/Schema/CIM_OwningJobElement.h"
-#include "Providers/Schema/CIM_PortController.h"
-#include "Providers/Schema/CIM_ReferencedProfile.h"
-#include "Providers/Schema/CIM_RegisteredProfile.h"
-#include "Providers/Schema/CIM_ServiceAffectsElement.h"
-#include "Providers/Schema/CIM_SoftwareIdentity.h"
-#include "Providers/Schema/CIM_SoftwareIdentityResource.h"
 #include "Providers/Schema/CIM_SoftwareInstallationService.h"
-#include "Providers/Schema/CIM_SoftwareInstallationServiceCapabilities.h"
 #include "Providers/Schema/SchemaTable.h"
+#include "Support/ProviderLibrary.h"
 
 namespace {
 
-const core::CimClassInfo* const leaves[] = {
-    &CIM_ConcreteJob::classInfo,
-    &CIM_SoftwareInstallationService::classInfo,
-    &CIM_SoftwareInstallationServiceCapabilities::classInfo,
-    &CIM_ReferencedProfile::classInfo,
-    &CIM_RegisteredProfile::classInfo,
-    &CIM_AffectedJobElement::classInfo,
-    &CIM_OwningJobElement::classInfo,
-    &CIM_ServiceAffectsElement::classInfo,
-    &CIM_ElementCapabilities::classInfo,
-    &CIM_ElementConformsToProfile::classInfo,
-    &CIM_EthernetPort::classInfo,
-    &CIM_PortController::classInfo,
-    &CIM_SoftwareIdentity::classInfo,
-    &CIM_SoftwareIdentityResource::classInfo,
-    &CIM_ElementSoftwareIdentity::classInfo,
-};
-
-/// All classes, by name: the leaves and what is above them.
+/// The classes of the schema, by name: those that the providers' own classes are built on.
 std::map<std::string, const core::CimClassInfo*> allClasses() {
     std::map<std::string, const core::CimClassInfo*> classes;
-    for (const core::CimClassInfo* info : leaves) {
-        for (; info != nullptr; info = info->superclass)
-            classes[info->name] = info;
+    for (const core::AgentUse& use : core::GetCimBroker()->useAgents()) {
+        for (const core::ServedClass* served : use.agent().getClasses().getAll()) {
+            for (const auto* info = served->info; info != nullptr; info = info->superclass)
+                if (std::string(info->name).starts_with("CIM_")) classes[info->name] = info;
+        }
     }
     return classes;
 }
@@ -95,6 +66,8 @@ std::string wordOf(core::CimProperty& property) {
 }
 
 TEST(Schema, HasTheClassesOfTheTableWithTheirMembersInOrder) {
+    const test::ProviderLibrary inventory(QUENX_INVENTORY_LIBRARY);
+    const test::ProviderLibrary update(QUENX_UPDATE_LIBRARY);
     const auto classes = allClasses();
     EXPECT_EQ(classes.size(), std::size(kSchemaTable));
     for (const SchemaRow& row : kSchemaTable) {
