@@ -41,15 +41,14 @@ TEST(Terminal, CutsAndDisarmsText) {
     EXPECT_EQ(out.str(), "A             B\nlong\\x0a\\x1b  x\n              \n");
 }
 
-/// What a display puts out when told of these percentages, a second apart, and of Ctrl-C before 55.
-std::string show(bool canRewrite, const std::vector<unsigned>& percentages) {
+/// What a display puts out that is no terminal, told of these percentages, a second apart.
+std::string show(const std::vector<unsigned>& percentages) {
     std::ostringstream out;
-    cli::LinePrinter printer(out, {canRewrite, -1});
+    cli::LinePrinter printer(out, {false, -1});
     std::chrono::steady_clock::time_point now{};
     cli::ProgressDisplay display(printer, [&] { return now; });
     display.started("eth0", 0);
     for (const unsigned percent : percentages) {
-        if (percent == 55) display.interrupted();
         display.progressed(percent);
         now += seconds(1);
     }
@@ -57,23 +56,9 @@ std::string show(bool canRewrite, const std::vector<unsigned>& percentages) {
     return out.str();
 }
 
-const std::string kGoesOn =
-    "The update of eth0 cannot be stopped half-way: it goes on to its end, and this program waits for it.\n";
-
-TEST(Display, WritesOverOneLineOnATerminal) {
-    const std::string clear = "\r\x1B[K";
-    const std::string bar20 = "eth0  [========>                               ]  20 %";
-    EXPECT_EQ(show(true, {20, 20, 55, 100}),
-              clear + bar20 + clear + bar20 + clear + kGoesOn + bar20 + clear +
-                  "eth0  [======================>                 ]  55 %  0:03 left" + clear +
-                  "eth0  [========================================] 100 %\n");
-}
-
-TEST(Display, WritesPlainLinesElsewhere) {
-    EXPECT_EQ(show(false, {20, 20, 55, 100}),
-              "eth0: 0 %\neth0: 20 %\n" + kGoesOn + "eth0: 55 %, 0:03 left\neth0: 100 %\n");
-    // It is not silent when nothing moves.
-    EXPECT_EQ(show(false, std::vector<unsigned>(25, 3)), "eth0: 0 %\neth0: 3 %\neth0: 3 %\n");
+TEST(Display, WritesPlainLinesAndIsNotSilentWhenNothingMoves) {
+    EXPECT_EQ(show({20, 20, 55, 100}), "eth0: 0 %\neth0: 20 %\neth0: 55 %, 0:03 left\neth0: 100 %\n");
+    EXPECT_EQ(show(std::vector<unsigned>(25, 3)), "eth0: 0 %\neth0: 3 %\neth0: 3 %\n");
 }
 
 }  // namespace

@@ -5,21 +5,6 @@
 
 namespace {
 
-TEST(CimProperty, StartsNullAndAssignmentEndsIt) {
-    test::Gadget gadget;
-    EXPECT_EQ(core::datetimeText(gadget.Made.get()), "00000000000000.000000:000");
-
-    gadget.Codes.push_back(7);
-    gadget.Codes.setNull();
-    gadget.Codes.push_back(2);
-    EXPECT_EQ(gadget.Codes.get(), std::vector<unsigned short>{2});
-    gadget.Codes.clear();
-    EXPECT_FALSE(gadget.Codes.IsNull());
-    gadget.ID = "text";
-    gadget.ID = gadget.Caption;
-    EXPECT_TRUE(gadget.ID.IsNull());
-}
-
 TEST(CimProperty, ModificationChecksEverythingFirst) {
     test::Gadget gadget("x");
     gadget.Caption.setLengthBounds(2, 5);

@@ -2,18 +2,11 @@
 
 #include <gtest/gtest.h>
 
-#include <cstdio>
 #include <cstdlib>
-#include <memory>
+#include <fstream>
 #include <system_error>
 
 namespace test {
-
-namespace {
-
-using File = std::unique_ptr<FILE, int (*)(FILE*)>;
-
-}  // namespace
 
 TempFolder::TempFolder() {
     std::string pattern = (std::filesystem::temp_directory_path() / "quenx-test-XXXXXX").string();
@@ -38,18 +31,14 @@ std::string TempFolder::write(std::string_view name, std::span<const uint8_t> co
 }
 
 void writeTestFile(const std::string& path, std::string_view content) {
-    const File file(std::fopen(path.c_str(), "wb"), &std::fclose);
-    const std::size_t written = file ? std::fwrite(content.data(), 1, content.size(), file.get()) : 0;
-    EXPECT_TRUE(file && written == content.size()) << path;
+    std::ofstream file(path, std::ios::binary);
+    EXPECT_TRUE(file << content << std::flush) << path;
 }
 
 std::vector<uint8_t> readTestFile(const std::string& path) {
-    const File file(std::fopen(path.c_str(), "rb"), &std::fclose);
+    std::ifstream file(path, std::ios::binary);
     EXPECT_TRUE(file) << path;
-    if (!file) return {};
-    std::vector<uint8_t> bytes(static_cast<std::size_t>(std::filesystem::file_size(path)));
-    bytes.resize(std::fread(bytes.data(), 1, bytes.size(), file.get()));
-    return bytes;
+    return {std::istreambuf_iterator<char>(file), {}};
 }
 
 }  // namespace test

@@ -181,9 +181,4 @@ TEST_F(ConcreteJobTest, TheStatusOfThePreparationDecides) {
     }
 }
 
-TEST_F(ConcreteJobTest, AWorkerNeedsAJob) {
-    EXPECT_THROW(JobThread(nullptr), utils::Exception);
-    EXPECT_TRUE(test::SyslogCapture::contains("Assertion failed: '__null != myJob'"));
-}
-
 }  // namespace

@@ -3,6 +3,7 @@
 
 #include <set>
 
+#include "MidAPI/RomLayout.h"
 #include "Providers/SoftwareUpdate/UpdateTest.h"
 #include "Support/TestRoms.h"
 
@@ -207,6 +208,10 @@ std::vector<MethodsTest::Row> MethodsTest::resolutionRows() const {
     const CimPath nowhere(std::string("Quenx_EthernetPort.DeviceID=\"a \\\"quoted\\\\ one\""));
     const CimPath noPath(std::string("no path at all"));
     const CimPath installed(std::string("Quenx_SoftwareIdentity.InstanceID=\"Quenx:eth0:IMG_PXE\""));
+    auto foreign = madeRom({{FirmwareType::PXE, 2}});
+    foreign[foreign[ma::rom::HEADER_DATA_STRUCTURE] + ma::rom::PCIR_CODE_TYPE] = ma::rom::CODE_OPEN_FIRMWARE;
+    const CimPath typeless = identityOf(file("foreign.rom", foreign));
+    const std::string noTypes = "Source '" + typeless.toString() + "' does not contain any TargetTypes";
     const std::string notFound = "Firmware Update cannot find instance '";
     const std::string noSource = "Firmware Update does not support source '";
     const std::string noTarget = "Firmware Update does not support target '" + service().toString() + "'";
@@ -218,6 +223,8 @@ std::vector<MethodsTest::Row> MethodsTest::resolutionRows() const {
         {fromUri(m_uri, service()), 4106, {noTarget}},
         {check(m_image, service()), 4106, {noTarget}},
         {fromIdentity(m_image, service()), 4106, {noTarget}},
+        {check(typeless, m_port), 5, {noTypes}},
+        {fromIdentity(typeless, m_port), 5, {noTypes}},
         {check(m_image, m_port),
          0,
          {"TargetTypes are: IMG_PXE+IMG_UEFI", "URI is: " + m_uri, "Verification of image returns: 0",
