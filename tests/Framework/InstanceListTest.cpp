@@ -4,10 +4,8 @@
 #include <unistd.h>
 
 #include <cstdlib>
-#include <thread>
 
 #include "Framework/CimAgent.h"
-#include "Framework/RequestScope.h"
 #include "Framework/Retirement.h"
 #include "Support/TestModel.h"
 
@@ -42,20 +40,6 @@ TEST_F(InstanceListTest, AnIteratorHoldsWhatItWalks) {
     EXPECT_THROW(static_cast<void>(iterator.first()), utils::Exception);
 }
 
-TEST_F(InstanceListTest, AScopeHoldsPlainPointers) {
-    core::InstanceList list;
-    {
-        const core::RequestScope scope;
-        auto* added = new Gadget("added");
-        {
-            const core::RequestScope inner;
-            list.add(added);
-        }
-        list.clear();
-        EXPECT_EQ(added->ID.get(), "added");
-    }
-}
-
 TEST_F(InstanceListTest, ADeletedInstanceIsGoneAtOnce) {
     core::InstanceList list;
     core::InstanceList built;
@@ -72,8 +56,6 @@ TEST_F(InstanceListTest, ADeletedInstanceIsGoneAtOnce) {
 
 struct Slow : Gadget {
     Slow() : Gadget("slow") { setDestructionWaits(); }
-    ~Slow() override { destroyer = std::this_thread::get_id(); }
-    static inline std::thread::id destroyer;
 };
 
 void retireOne() {
@@ -81,12 +63,6 @@ void retireOne() {
     list.add(new Slow);
     list.clear();
     core::drainRetired();
-}
-
-TEST_F(InstanceListTest, SlowDestructorsRunElsewhere) {
-    retireOne();
-    EXPECT_NE(Slow::destroyer, std::thread::id());
-    EXPECT_NE(Slow::destroyer, std::this_thread::get_id());
 }
 
 TEST_F(InstanceListTest, InstancesCanBeRetiredUntilTheProcessHasEnded) {

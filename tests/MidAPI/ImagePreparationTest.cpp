@@ -107,18 +107,13 @@ TEST(ImagePreparation, losingTheClpEntryIsAnotherType) {
     EXPECT_EQ(ma::PREPARED, ma::assessImage(target, test::madeRom({{CLP, 1}}), {PXE}).status);
 }
 
-TEST(ImagePreparation, missingBuffersAreInvalid) {
+TEST(ImagePreparation, aBufferThatIsTooSmallIsInvalid) {
     const test::SimulatedAdapters adapters;
     const Rom rom = test::madeRom({{PXE, 1}});
-    Rom output(rom.size());
-    const auto size = static_cast<uint32_t>(rom.size());
-    uint32_t imageSize = size;
+    Rom output(rom.size() - 1);
+    auto imageSize = static_cast<uint32_t>(output.size());
     Types types;
-    EXPECT_EQ(1, ma::prepareFlashImage("eth0", nullptr, size, output.data(), &imageSize, types));
-    EXPECT_EQ(1, ma::prepareFlashImage("eth0", rom.data(), size, nullptr, &imageSize, types));
-    EXPECT_EQ(1, ma::prepareFlashImage("eth0", rom.data(), size, output.data(), nullptr, types));
-    imageSize = size - 1;
-    EXPECT_EQ(1, ma::prepareFlashImage("eth0", rom.data(), size, output.data(), &imageSize, types));
+    EXPECT_EQ(1, ma::prepareFlashImage("eth0", rom.data(), imageSize + 1, output.data(), &imageSize, types));
 }
 
 }  // namespace

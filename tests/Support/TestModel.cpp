@@ -32,10 +32,6 @@ const core::CimClassInfo Link::classInfo{"Test_Link", nullptr, true, {}, core::m
 
 std::atomic<int> Gadget::living{0};
 
-Thing::Thing() {
-    declareClass(classInfo);
-}
-
 Gadget::Gadget() {
     ++living;
     addMethod("Work", &Gadget::Work);
@@ -50,10 +46,6 @@ Gadget::Gadget(const std::string& id, unsigned int number) : Gadget() {
     Caption = "Gadget " + id;
 }
 
-Gadget::~Gadget() {
-    --living;
-}
-
 unsigned int Gadget::Work(core::CimPropertyList& in, core::CimPropertyList& out, core::CimInstance*& job) {
     const auto* text = dynamic_cast<core::CimPropertyString*>(in.getPropertyByName("Text"));
     if (text == nullptr || text->IsNull()) throw std::runtime_error("Text is missing");
@@ -62,15 +54,6 @@ unsigned int Gadget::Work(core::CimPropertyList& in, core::CimPropertyList& out,
     *echo = echo->get() + text->get();
     job = this;
     return std::accumulate(numbers.begin(), numbers.end(), 0U);
-}
-
-Link::Reference::Reference(const char* name, core::CimInstance* owner) : CimPropertyRef(name, owner) {
-    setReferenceClass(Gadget::classInfo.name);
-}
-
-Link::Reference& Link::Reference::operator=(const Gadget* target) {
-    assign(target);
-    return *this;
 }
 
 Link::Link() {
@@ -91,8 +74,7 @@ int GadgetClass::DeleteInstance(core::CimPath& path) {
     return 0;
 }
 
-GadgetAgent::GadgetAgent(const std::string& providerName)
-    : CimAgent(providerName), m_gadgets(new GadgetClass), m_links(nullptr) {
+GadgetAgent::GadgetAgent() : CimAgent("Test Gadgets"), m_gadgets(new GadgetClass), m_links(nullptr) {
     core::GetCimBroker()->addAgent(this);
     m_classes.add(m_gadgets);
     m_links = new ListedClass<Link>;

@@ -14,7 +14,7 @@ namespace test {
 class Thing : public core::CimInstance {
   public:
     static const core::CimClassInfo classInfo;
-    Thing();
+    Thing() { declareClass(classInfo); }
     core::CimPropertyString ID{"ID", this};
     core::CimPropertyString Caption{"Caption", this};
     core::CimPropertyUint16_arr Codes{"Codes", this};
@@ -27,7 +27,7 @@ class Gadget : public Thing {
     static std::atomic<int> living;
     Gadget();
     explicit Gadget(const std::string& id, unsigned int number = 0);
-    ~Gadget() override;
+    ~Gadget() override { --living; }
     std::string getClassName() const override { return "Test_Gadget"; }
 
     /// Returns the sum of Numbers, hands its Text back as Echo, and itself as the job. Throws for a null
@@ -51,8 +51,13 @@ class Link : public core::CimInstance {
 
     class Reference : public core::CimPropertyRef {
       public:
-        Reference(const char* name, core::CimInstance* owner);
-        Reference& operator=(const Gadget* target);
+        Reference(const char* name, core::CimInstance* owner) : CimPropertyRef(name, owner) {
+            setReferenceClass(Gadget::classInfo.name);
+        }
+        Reference& operator=(const Gadget* target) {
+            assign(target);
+            return *this;
+        }
     };
     Reference From{"From", this};
     Reference To{"To", this};
@@ -81,7 +86,7 @@ class GadgetClass : public ListedClass<Gadget> {
 /// An agent that serves gadgets and links. Registers itself, and leaves when destroyed.
 class GadgetAgent : public core::CimAgent {
   public:
-    explicit GadgetAgent(const std::string& providerName = "Test Gadgets");
+    GadgetAgent();
     ~GadgetAgent() override { leaveBroker(); }
 
     GadgetClass& gadgets() { return *m_gadgets; }

@@ -66,21 +66,6 @@ TEST(AutoSingleton, TwoFirstCallsMakeOneWholeInstanceThatANewerOneHides) {
     EXPECT_EQ(Slow::getInstance(), created);
 }
 
-TEST(OSLocker, AScopeTakesTheCurrentLockerAndFreesItEvenIfItWasBusy) {
-    const test::LogLevelGuard guard(2);
-    os::OSLockerLinux locker;
-    EXPECT_EQ(locker.Lock(), 0);
-    {
-        const OSLocker::AutoOSLocker scope;
-        EXPECT_EQ(locker.Lock(), 2);
-    }
-    EXPECT_EQ(locker.Lock(), 0);
-    EXPECT_EQ(locker.UnLock(), 0);
-    EXPECT_EQ(locker.UnLock(), 0);
-    EXPECT_EQ(SyslogCapture::count("\"autolocking semaphore\""), 1U);
-    EXPECT_EQ(SyslogCapture::count("\"autoreleasing semaphore\""), 1U);
-}
-
 TEST(OSLocker, AMissingLockerFailsTheBeginningButNotTheEndOfAScope) {
     const test::LogLevelGuard guard(1);
     EXPECT_THROW(const OSLocker::AutoOSLocker scope, utils::Exception);
