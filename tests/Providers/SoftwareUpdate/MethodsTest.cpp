@@ -275,6 +275,14 @@ TEST_F(MethodsTest, WhatCannotBeLookedUpIsNotFound) {
     };
     EXPECT_EQ(outcome(fromUri(m_uri, m_controller)), 5U);
     EXPECT_TRUE(test::SyslogCapture::contains("Firmware Update does not support instance '"));
+    // The identity is found, and then its file is gone.
+    test::SyslogCapture::observe([this](const std::string& line) {
+        if (line.find("@Quenx_SoftwareIdentityResource.cpp") != std::string::npos)
+            std::filesystem::remove(m_folder / "good.rom");
+    });
+    EXPECT_EQ(outcome(fromIdentity(m_image, m_port)), 5U);
+    test::SyslogCapture::observe(nullptr);
+    EXPECT_TRUE(test::SyslogCapture::contains("\"Could not obtain URI from the SoftwareIdentityResource ("));
 }
 
 TEST_F(MethodsTest, FlashARealImageByteForByte) {
