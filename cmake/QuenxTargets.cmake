@@ -41,7 +41,8 @@ if(QUENX_FUZZ)
     target_compile_options(quenx_settings INTERFACE -fsanitize=fuzzer-no-link)
 endif()
 if(QUENX_COVERAGE)
-    target_compile_options(quenx_settings INTERFACE --coverage)
+    # Counters that threads share go wrong otherwise, below zero even, which gcovr refuses.
+    target_compile_options(quenx_settings INTERFACE --coverage -fprofile-update=atomic)
     target_link_options(quenx_settings INTERFACE --coverage)
 endif()
 
