@@ -25,7 +25,8 @@ JobView lookAt(Management& management, const core::CimPath& job, const Following
         } catch (const core::CimError& error) {
             if (error.status() != core::CimStatus::NotFound) throw;
             throw Failure(ExitStatus::Failed,
-                          "The job was deleted by somebody. The update goes on to its end, unseen.",
+                          "The server does not know the job any more: it was deleted, or the server was "
+                          "started anew. The update runs to its end all the same.",
                           "\"quenxctl adapters\" shows the version afterwards.");
         }
         following.pause();

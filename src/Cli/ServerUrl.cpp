@@ -18,7 +18,9 @@ constexpr const char* CIM_PATH = "/cimom";
 using Url = std::unique_ptr<CURLU, decltype(&curl_url_cleanup)>;
 
 [[noreturn]] void refuse(const std::string& text, const std::string& why) {
-    throw Failure(ExitStatus::WrongUse, "--server \"" + text + "\" " + why + ".",
+    // What stands before an @ may be a password.
+    const std::string shown = text.find('@') == std::string::npos ? " \"" + text + "\"" : std::string();
+    throw Failure(ExitStatus::WrongUse, "--server" + shown + " " + why + ".",
                   "Write it as https://host:5989.");
 }
 

@@ -38,7 +38,6 @@ class CimPropertyScalar : public CimProperty {
 
     CimPropertyScalar& operator=(T value) {
         const Guard guard(*this);
-        if (!isNull() && m_value == value) return *this;
         m_value = std::move(value);
         changed();
         return *this;

@@ -20,10 +20,11 @@ AuthenticationResult Authentication::authenticate(const std::optional<std::strin
                                                   const std::string& address) {
     const auto credentials = header ? readBasicHeader(*header) : std::nullopt;
     if (!credentials) return {AuthenticationOutcome::Missing, {}};
-    std::optional<Identity> identity = m_cache.find(*credentials);
+    std::optional<Identity> identity = m_cache.find(*credentials, FailureDelays::keyOf(address));
     if (!identity) {
         // Whoever guesses passwords shall not keep those out who share the address and know theirs.
-        if (!m_cache.knows(*credentials) && !waitForTurn(address)) return {AuthenticationOutcome::Busy, {}};
+        if (!m_cache.knows(*credentials, FailureDelays::keyOf(address)) && !waitForTurn(address))
+            return {AuthenticationOutcome::Busy, {}};
         const Slots::Use check(m_checks, kWaitForCheck);
         if (!check) return {AuthenticationOutcome::Busy, {}};
         identity = checkNow(*credentials, address);
@@ -40,15 +41,16 @@ bool Authentication::waitForTurn(const std::string& address) {
 
 std::optional<Identity> Authentication::checkNow(const Credentials& credentials, const std::string& address) {
     // Several requests may have come with the same credentials while the first of them was checked.
-    std::optional<Identity> identity = m_cache.find(credentials);
+    const std::string place = FailureDelays::keyOf(address);
+    std::optional<Identity> identity = m_cache.find(credentials, place);
     if (identity) return identity;
     identity = m_checker->check(credentials, address);
     if (identity) {
         // One who did not have to wait says nothing about the others there.
-        if (!m_cache.knows(credentials)) m_delays.succeeded(address);
-        m_cache.remember(credentials, *identity);
+        if (!m_cache.knows(credentials, place)) m_delays.succeeded(address);
+        m_cache.remember(credentials, place, *identity);
     } else {
-        m_cache.forget(credentials);
+        m_cache.forget(credentials, place);
         m_delays.failed(address);
         QUENX_ERROR("wrong user or password \"%s\" from %s", credentials.user.c_str(), address.c_str());
     }

@@ -29,9 +29,10 @@ void CredentialCache::clear() {
     m_entries.clear();
 }
 
-CredentialCache::Digest CredentialCache::digestOf(const Credentials& credentials) const {
-    // A user name has no NUL, so no two pairs make one text.
-    const std::string text = credentials.user + '\0' + credentials.password;
+CredentialCache::Digest CredentialCache::digestOf(const Credentials& credentials,
+                                                  const std::string& place) const {
+    // A user name has no NUL and the place tells its length, so no two of them make one text.
+    const std::string text = std::to_string(place.size()) + ':' + place + credentials.user + '\0' + credentials.password;
     Digest digest{};
     if (::gnutls_hmac_fast(GNUTLS_MAC_SHA256, m_key.data(), m_key.size(), text.data(), text.size(),
                            digest.data()) != 0) {
@@ -40,31 +41,32 @@ CredentialCache::Digest CredentialCache::digestOf(const Credentials& credentials
     return digest;
 }
 
-std::optional<Identity> CredentialCache::find(const Credentials& credentials) {
+std::optional<Identity> CredentialCache::find(const Credentials& credentials, const std::string& place) {
     const utils::Mutex::AutoLocker lock(m_mutex);
-    const auto found = m_entries.find(digestOf(credentials));
+    const auto found = m_entries.find(digestOf(credentials, place));
     if (found == m_entries.end() || found->second.expires <= Clock::now()) return std::nullopt;
     return found->second.identity;
 }
 
-bool CredentialCache::knows(const Credentials& credentials) {
+bool CredentialCache::knows(const Credentials& credentials, const std::string& place) {
     const utils::Mutex::AutoLocker lock(m_mutex);
-    return m_entries.contains(digestOf(credentials));
+    return m_entries.contains(digestOf(credentials, place));
 }
 
-void CredentialCache::remember(const Credentials& credentials, const Identity& identity) {
+void CredentialCache::remember(const Credentials& credentials, const std::string& place,
+                               const Identity& identity) {
     const utils::Mutex::AutoLocker lock(m_mutex);
     if (m_entries.size() >= kMostEntries) {
         m_entries.erase(std::min_element(
             m_entries.begin(), m_entries.end(),
             [](const auto& a, const auto& b) { return a.second.expires < b.second.expires; }));
     }
-    m_entries[digestOf(credentials)] = {identity, Clock::now() + m_rememberFor};
+    m_entries[digestOf(credentials, place)] = {identity, Clock::now() + m_rememberFor};
 }
 
-void CredentialCache::forget(const Credentials& credentials) {
+void CredentialCache::forget(const Credentials& credentials, const std::string& place) {
     const utils::Mutex::AutoLocker lock(m_mutex);
-    m_entries.erase(digestOf(credentials));
+    m_entries.erase(digestOf(credentials, place));
 }
 
 }  // namespace host

@@ -13,18 +13,20 @@ namespace host {
 
 /// Remembers for a short while whose credentials were right, since checking a password costs tens of
 /// milliseconds and clients send it with every request; and for good which ones were, so that those need not
-/// wait with the ones that somebody guesses. Keeps no password: only a keyed hash (HMAC-SHA-256) under a key
-/// of this process, of the thousand credentials last seen. Thread-safe.
+/// wait with the ones that somebody guesses. Both hold for the place (the address) that they came from only,
+/// or one user's login would let everybody everywhere guess that user's password without delay; those at the
+/// same place still can. Keeps no password: only a keyed hash (HMAC-SHA-256) under a key of this process, of
+/// the thousand credentials last verified. Thread-safe.
 class CredentialCache {
   public:
     explicit CredentialCache(std::chrono::seconds rememberFor);
 
     /// Nothing when they were never right, or too long ago.
-    std::optional<Identity> find(const Credentials& credentials);
+    std::optional<Identity> find(const Credentials& credentials, const std::string& place);
     /// Whether they were right once.
-    bool knows(const Credentials& credentials);
-    void remember(const Credentials& credentials, const Identity& identity);
-    void forget(const Credentials& credentials);
+    bool knows(const Credentials& credentials, const std::string& place);
+    void remember(const Credentials& credentials, const std::string& place, const Identity& identity);
+    void forget(const Credentials& credentials, const std::string& place);
     /// Forgets everything and takes a new key.
     void clear();
 
@@ -36,7 +38,7 @@ class CredentialCache {
         Clock::time_point expires;
     };
 
-    Digest digestOf(const Credentials& credentials) const QUENX_REQUIRES(m_mutex);
+    Digest digestOf(const Credentials& credentials, const std::string& place) const QUENX_REQUIRES(m_mutex);
 
     const std::chrono::seconds m_rememberFor;
     utils::Mutex m_mutex;

@@ -23,6 +23,9 @@ class FailureDelays {
     void failed(const std::string& address, Clock::time_point now = Clock::now());
     void succeeded(const std::string& address);
 
+    /// What counts as one place: an IPv4 address, or the network of an IPv6 one.
+    static std::string keyOf(const std::string& address);
+
   private:
     struct Record {
         unsigned int failures = 0;
@@ -30,7 +33,6 @@ class FailureDelays {
         Clock::time_point last;  ///< the last failure
     };
 
-    static std::string keyOf(const std::string& address);
     static Clock::duration delayAfter(unsigned int failures);
 
     utils::Mutex m_mutex;

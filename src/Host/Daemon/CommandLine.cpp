@@ -60,7 +60,7 @@ CommandLine readCommandLine(int argc, const char* const* argv) {
         "Serves firmware updates of Ethernet adapters over CIM-XML.\n"
         "SIGTERM: take no more requests, answer those in flight, wait for flashes that have begun,\n"
         "exit 0. A second SIGTERM shortens nothing. SIGHUP: read certificate and users again.\n"
-        "Exit status: 0 done, 1 failed, 2 wrong use or configuration.",
+        "Exit status: 0 done, 1 failed, 2 wrong use, or a fault that --check-config finds.",
         "quenx-cimd");
     app.set_version_flag("--version", QUENX_VERSION);
     std::string file;

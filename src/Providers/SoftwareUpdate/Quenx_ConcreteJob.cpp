@@ -109,6 +109,7 @@ void Quenx_ConcreteJob::setJobState(JobStateVal state) {
     std::unique_ptr<std::uint8_t[]> released;
     const utils::Mutex::AutoLocker lock(m_stateMutex);
     m_jobState = state;
+    m_startClaimed = false;
     m_timeOfLastStateChange.resetTimer();
     m_finished = isFinished(state).value_or(m_finished);
     if (state == JobStateCompleted) m_elapsedTime.setInterval(m_startTime);
