@@ -4,7 +4,7 @@
 #include <cstdint>
 
 /// Numbers of the expansion ROM format: PCI Firmware Specification 3.x (expansion ROM chapters), Plug and
-/// Play BIOS Specification (expansion header), UEFI Specification (PCI option ROM). All fields are
+/// Play BIOS 1.0A (expansion header), UEFI (PCI option ROM). All fields are
 /// little-endian.
 namespace ma::rom {
 

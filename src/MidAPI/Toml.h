@@ -4,8 +4,8 @@
 /// belongs to a key, it takes for impossible what it did not list, so that most letters beyond ASCII lead
 /// into undefined behaviour. Here they are simply neither.
 ///
-/// It asserts, or lets the compiler take for granted, what a bad file can break ("[[["); the branch after such
-/// an assertion reports the file's fault, and so must be reached.
+/// It asserts, or lets the compiler take for granted, what a bad file can break ("[[["); the branch after
+/// such an assertion reports the file's fault, and so must be reached.
 
 #define TOML_EXCEPTIONS 0
 // clang-format off: the order matters

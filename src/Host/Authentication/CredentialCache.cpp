@@ -32,7 +32,8 @@ void CredentialCache::clear() {
 CredentialCache::Digest CredentialCache::digestOf(const Credentials& credentials,
                                                   const std::string& place) const {
     // A user name has no NUL and the place tells its length, so no two of them make one text.
-    const std::string text = std::to_string(place.size()) + ':' + place + credentials.user + '\0' + credentials.password;
+    const std::string text =
+        std::to_string(place.size()) + ':' + place + credentials.user + '\0' + credentials.password;
     Digest digest{};
     if (::gnutls_hmac_fast(GNUTLS_MAC_SHA256, m_key.data(), m_key.size(), text.data(), text.size(),
                            digest.data()) != 0) {

@@ -23,7 +23,8 @@ using UserEntries = std::map<std::string, UserEntry>;
 /// or others, or a line (by its number) has not the form above.
 UserEntries readUsersFile(const std::string& path);
 
-/// Writes the file anew, mode 0600, in one step; makes its directory when it is missing. Throws std::runtime_error.
+/// Writes the file anew, mode 0600, in one step; makes its directory when it is missing. Throws
+/// std::runtime_error.
 void writeUsersFile(const std::string& path, const UserEntries& users);
 
 /// Whether the name can stand in the file.
