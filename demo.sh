@@ -70,7 +70,7 @@ state = "$PWD/$scratch/adapters.state"
 [daemon]
 lock_file = "$PWD/$scratch/lock"
 EOF
-echo demo | "$daemon" passwd --users "$scratch/users" demo
+echo demo | "$daemon" --config "$scratch/quenx-cimd.toml" passwd demo
 printf '\n$ %s\n' "$daemon --config $scratch/quenx-cimd.toml"
 "$daemon" --config "$scratch/quenx-cimd.toml" >"$scratch/daemon.log" 2>&1 &
 daemon_id=$!

@@ -87,7 +87,7 @@ struct HttpClient::Handle {
 };
 
 HttpClient::HttpClient(const ServerUrl& url, const ServerSettings& settings)
-    : handle_(std::make_unique<Handle>()), url_(url.text()) {
+    : handle_(std::make_unique<Handle>()), url_(url.text()), namesCaFile_(!settings.caFile.empty()) {
     if (handle_->curl == nullptr) {
         throw Failure(ExitStatus::Failed, "The HTTP library could not be started.",
                       "Free some memory and try again.");
@@ -105,7 +105,7 @@ HttpClient::HttpClient(const ServerUrl& url, const ServerSettings& settings)
     handle_->set(CURLOPT_PASSWORD, settings.password.c_str());
     // A proxy would take 127.0.0.1 for itself, and get the password.
     if (url.isLoopback()) handle_->set(CURLOPT_NOPROXY, "*");
-    if (!settings.caFile.empty()) handle_->set(CURLOPT_CAINFO, settings.caFile.c_str());
+    if (namesCaFile_) handle_->set(CURLOPT_CAINFO, settings.caFile.c_str());
     if (settings.insecure) {
         handle_->set(CURLOPT_SSL_VERIFYPEER, 0L);
         handle_->set(CURLOPT_SSL_VERIFYHOST, 0L);
@@ -123,7 +123,9 @@ HttpReply HttpClient::post(const std::vector<std::string>& headers, const std::s
     handle_->set(CURLOPT_WRITEDATA, &reply);
     handle_->set(CURLOPT_HEADERDATA, &reply);
     handle_->error[0] = '\0';
-    const CURLcode code = curl_easy_perform(handle_->curl);
+    CURLcode code = curl_easy_perform(handle_->curl);
+    // Without a file of its own, and without those that the system may have, nobody is trusted.
+    if (code == CURLE_SSL_CACERT_BADFILE && !namesCaFile_) code = CURLE_PEER_FAILED_VERIFICATION;
     if (code != CURLE_OK) {
         const char* reason = handle_->error[0] == '\0' ? curl_easy_strerror(code) : handle_->error;
         const auto status = code == CURLE_SSL_CACERT_BADFILE ? ExitStatus::WrongUse : ExitStatus::Failed;

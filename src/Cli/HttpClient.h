@@ -39,6 +39,7 @@ class HttpClient {
     struct Handle;
     std::unique_ptr<Handle> handle_;
     std::string url_;
+    bool namesCaFile_;
 };
 
 }  // namespace cli

@@ -44,11 +44,12 @@ std::optional<Identity> Authentication::checkNow(const Credentials& credentials,
     const std::string place = FailureDelays::keyOf(address);
     std::optional<Identity> identity = m_cache.find(credentials, place);
     if (identity) return identity;
+    const std::uint64_t generation = m_cache.generation();
     identity = m_checker->check(credentials, address);
     if (identity) {
         // One who did not have to wait says nothing about the others there.
         if (!m_cache.knows(credentials, place)) m_delays.succeeded(address);
-        m_cache.remember(credentials, place, *identity);
+        m_cache.remember(credentials, place, *identity, generation);
     } else {
         m_cache.forget(credentials, place);
         m_delays.failed(address);

@@ -25,8 +25,14 @@ void CredentialCache::clear() {
         throw std::runtime_error("no random numbers for a key");
     }
     const utils::Mutex::AutoLocker lock(m_mutex);
+    ++m_generation;
     m_key = key;
     m_entries.clear();
+}
+
+std::uint64_t CredentialCache::generation() {
+    const utils::Mutex::AutoLocker lock(m_mutex);
+    return m_generation;
 }
 
 CredentialCache::Digest CredentialCache::digestOf(const Credentials& credentials,
@@ -55,8 +61,9 @@ bool CredentialCache::knows(const Credentials& credentials, const std::string& p
 }
 
 void CredentialCache::remember(const Credentials& credentials, const std::string& place,
-                               const Identity& identity) {
+                               const Identity& identity, std::uint64_t generation) {
     const utils::Mutex::AutoLocker lock(m_mutex);
+    if (generation != m_generation) return;
     if (m_entries.size() >= kMostEntries) {
         m_entries.erase(std::min_element(
             m_entries.begin(), m_entries.end(),

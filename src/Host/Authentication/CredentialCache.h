@@ -2,6 +2,7 @@
 
 #include <array>
 #include <chrono>
+#include <cstdint>
 #include <map>
 #include <optional>
 
@@ -25,7 +26,11 @@ class CredentialCache {
     std::optional<Identity> find(const Credentials& credentials, const std::string& place);
     /// Whether they were right once.
     bool knows(const Credentials& credentials, const std::string& place);
-    void remember(const Credentials& credentials, const std::string& place, const Identity& identity);
+    /// How often everything was forgotten. To be asked before a check whose outcome is remembered: what was
+    /// found right by users that have been read anew since is not remembered.
+    std::uint64_t generation();
+    void remember(const Credentials& credentials, const std::string& place, const Identity& identity,
+                  std::uint64_t generation);
     void forget(const Credentials& credentials, const std::string& place);
     /// Forgets everything and takes a new key.
     void clear();
@@ -42,6 +47,7 @@ class CredentialCache {
 
     const std::chrono::seconds m_rememberFor;
     utils::Mutex m_mutex;
+    std::uint64_t m_generation QUENX_GUARDED_BY(m_mutex) = 0;
     Digest m_key QUENX_GUARDED_BY(m_mutex);
     std::map<Digest, Entry> m_entries QUENX_GUARDED_BY(m_mutex);
 };

@@ -209,11 +209,13 @@ std::vector<AdapterDescription> loadAdapterDescriptions(const std::string& path)
     constexpr std::size_t MOST_TEXT = std::size_t{4} * 1024 * 1024;
     std::optional<std::vector<uint8_t>> bytes;
     try {
-        bytes = readWholeFile(path, MOST_TEXT);
+        bytes = readWholeFile(path, MOST_TEXT + 1);
     } catch (const FlashError& error) {
         throw AdapterError(std::string("the adapter description: ") + error.what());
     }
     if (!bytes) throw AdapterError("there is no adapter description " + path + "; name a readable file");
+    if (bytes->size() > MOST_TEXT)
+        throw AdapterError("the adapter description " + path + " is longer than 4 MiB");
     std::vector<AdapterDescription> adapters =
         parseAdapterDescriptions(std::string(bytes->begin(), bytes->end()), path);
     const std::filesystem::path folder = std::filesystem::path(path).parent_path();

@@ -16,8 +16,9 @@ constexpr std::size_t MOST_FLASH = std::size_t{64} * 1024 * 1024;
 
 std::vector<uint8_t> readFlashFile(const AdapterDescription& adapter) try {
     if (adapter.flashFile.empty()) return {};
-    std::optional<std::vector<uint8_t>> bytes = readWholeFile(adapter.flashFile, MOST_FLASH);
+    std::optional<std::vector<uint8_t>> bytes = readWholeFile(adapter.flashFile, MOST_FLASH + 1);
     if (!bytes) refuseFlashFile(adapter, "is not there; name an expansion ROM file");
+    if (bytes->size() > MOST_FLASH) refuseFlashFile(adapter, "is longer than 64 MiB");
     if (const RomFile rom = parseOptionRom(*bytes); rom.error)
         refuseFlashFile(adapter, "is no intact ROM image: " + *rom.error);
     return *bytes;
