@@ -39,7 +39,7 @@ JobView followJob(Management& management, const core::CimPath& job, UpdateObserv
                   const Following& following) {
     unsigned shown = 0;
     while (true) {
-        const JobView view = lookAt(management, job, following);
+        JobView view = lookAt(management, job, following);
         if (const auto percent = view.certainPercent()) {
             shown = std::max(shown, *percent);
             observer.progressed(shown);

@@ -26,7 +26,7 @@ class Signals {
         for (const int signal : {SIGTERM, SIGINT, SIGHUP})
             ::sigaddset(&m_set, signal);
         ::pthread_sigmask(SIG_BLOCK, &m_set, nullptr);
-        std::signal(SIGPIPE, SIG_IGN);
+        (void)std::signal(SIGPIPE, SIG_IGN);
     }
 
     int wait() const {

@@ -121,7 +121,7 @@ std::string hashPassword(const std::string& password) {
 }
 
 UsersFile::UsersFile(std::string path) : m_path(std::move(path)) {
-    reload();
+    UsersFile::reload();
 }
 
 void UsersFile::reload() {
