@@ -37,7 +37,6 @@ fi
 case " ${presets[*]} " in *" x86-32 "*) groups+=(x86-32) ;; esac
 
 packaging/install-packages.sh "${groups[@]}"
-if command -v ccache >/dev/null; then export CMAKE_CXX_COMPILER_LAUNCHER=ccache; fi
 export ASAN_OPTIONS="${ASAN_OPTIONS:-detect_stack_use_after_return=1}"
 export UBSAN_OPTIONS="${UBSAN_OPTIONS:-print_stacktrace=1}"
 export TSAN_OPTIONS="${TSAN_OPTIONS:-halt_on_error=1 second_deadlock_stack=1}"

@@ -13,6 +13,14 @@ function(quenx_precompiled name)
     target_precompile_headers(${name} PRIVATE ${ARGN})
 endfunction()
 
+# What a compiler cache needs to know such headers again: the preprocessor's output naming them, no time in the file.
+add_library(quenx_precompiled_settings INTERFACE)
+if(CMAKE_CXX_COMPILER_ID STREQUAL "GNU")
+    target_compile_options(quenx_precompiled_settings INTERFACE -fpch-preprocess)
+else()
+    target_compile_options(quenx_precompiled_settings INTERFACE "SHELL:-Xclang -fno-pch-timestamp")
+endif()
+
 if(QUENX_PRECOMPILE)
     quenx_precompiled(quenx_precompiled_library ${quenx_standard_headers})
     set_target_properties(quenx_precompiled_library PROPERTIES POSITION_INDEPENDENT_CODE ON)

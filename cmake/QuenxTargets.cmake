@@ -47,6 +47,9 @@ if(QUENX_COVERAGE)
 endif()
 
 include(cmake/QuenxPrecompiled.cmake)
+if(QUENX_PRECOMPILE)
+    target_link_libraries(quenx_settings INTERFACE quenx_precompiled_settings)
+endif()
 
 # quenx_library(NAME SOURCES... [LINK targets...]): a shared library libNAME.so
 function(quenx_library name)
