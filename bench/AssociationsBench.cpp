@@ -3,7 +3,7 @@
 #include <dlfcn.h>
 
 #include "ColdCaches.h"
-#include "Framework/CimBroker.h"
+#include "Framework/Classes/CimBroker.h"
 #include "InstantAdapters.h"
 #include "Providers/SoftwareUpdate/Quenx_ConcreteJobClass.h"
 #include "Providers/SoftwareUpdate/SoftwareUpdateAgent.h"

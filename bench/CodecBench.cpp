@@ -2,10 +2,10 @@
 #include <benchmark/benchmark.h>
 #include <dlfcn.h>
 
-#include "Framework/CimRequests.h"
-#include "Host/CimXml/RequestReader.h"
-#include "Host/CimXml/ResponseReader.h"
-#include "Host/CimXml/ResponseWriter.h"
+#include "CimXml/RequestReader.h"
+#include "CimXml/ResponseReader.h"
+#include "CimXml/ResponseWriter.h"
+#include "Framework/Requests/CimRequests.h"
 #include "InstantAdapters.h"
 
 namespace {

@@ -3,7 +3,7 @@
 #include <malloc.h>
 
 #include "ColdCaches.h"
-#include "Framework/CimRequests.h"
+#include "Framework/Requests/CimRequests.h"
 #include "InstantAdapters.h"
 #include "Providers/SoftwareUpdate/Quenx_ConcreteJobClass.h"
 #include "Providers/SoftwareUpdate/SoftwareUpdateAgent.h"

@@ -7,7 +7,7 @@
 #include <chrono>
 #include <fstream>
 
-#include "Framework/CimBroker.h"
+#include "Framework/Classes/CimBroker.h"
 
 namespace {
 

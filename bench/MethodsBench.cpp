@@ -2,8 +2,8 @@
 #include <benchmark/benchmark.h>
 #include <dlfcn.h>
 
-#include "Framework/CimRequests.h"
-#include "Framework/Retirement.h"
+#include "Framework/Classes/Retirement.h"
+#include "Framework/Requests/CimRequests.h"
 #include "InstantAdapters.h"
 #include "Providers/SoftwareUpdate/Quenx_ConcreteJob.h"
 #include "Providers/SoftwareUpdate/SoftwareUpdateAgent.h"

@@ -3,7 +3,7 @@
 
 #include <span>
 
-#include "MidAPI/OptionRomWriter.h"
+#include "MidAPI/Image/OptionRomWriter.h"
 #include "Providers/SoftwareUpdate/Quenx_ConcreteJob.h"
 #include "Support/SimulatedAdapters.h"
 #include "Support/TestRoms.h"

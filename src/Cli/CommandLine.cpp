@@ -15,7 +15,7 @@
 #include "Cli/Json.h"
 #include "Cli/ProgressDisplay.h"
 #include "Cli/RemoteManagement.h"
-#include "Framework/CimError.h"
+#include "Framework/Model/CimError.h"
 
 namespace cli {
 

@@ -5,7 +5,7 @@
 #include <vector>
 
 #include "Cli/Adapters.h"
-#include "MidAPI/OptionRom.h"
+#include "MidAPI/Image/OptionRom.h"
 
 namespace cli {
 

@@ -5,7 +5,7 @@
 #include <string_view>
 
 #include "Cli/Failure.h"
-#include "Framework/CimType.h"
+#include "Framework/Model/CimType.h"
 #include "Utils/Utils.h"
 
 namespace cli {

@@ -3,7 +3,7 @@
 #include <algorithm>
 
 #include "Cli/Failure.h"
-#include "Framework/CimError.h"
+#include "Framework/Model/CimError.h"
 
 namespace cli {
 

@@ -6,7 +6,7 @@
 
 #include "Cli/Adapters.h"
 #include "Cli/Job.h"
-#include "Framework/CimRequests.h"
+#include "Framework/Requests/CimRequests.h"
 
 namespace cli {
 

@@ -4,8 +4,8 @@
 #include <string>
 
 #include "Cli/Management.h"
-#include "Framework/CimRequests.h"
-#include "Framework/ProviderLibraries.h"
+#include "Framework/Requests/CimRequests.h"
+#include "Framework/Requests/ProviderLibraries.h"
 #include "Utils/Os/Linux/LinuxOSLocker.h"
 #include "Utils/Os/Linux/SMASHv2Config.h"
 

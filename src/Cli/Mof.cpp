@@ -3,7 +3,7 @@
 #include <algorithm>
 #include <map>
 
-#include "Framework/SchemaQualifiers.h"
+#include "Framework/Model/SchemaQualifiers.h"
 
 namespace cli {
 

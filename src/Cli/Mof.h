@@ -3,7 +3,7 @@
 #include <string>
 #include <vector>
 
-#include "Framework/ClassDeclaration.h"
+#include "Framework/Model/ClassDeclaration.h"
 
 namespace cli {
 

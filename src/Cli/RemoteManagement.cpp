@@ -1,9 +1,9 @@
 #include "Cli/RemoteManagement.h"
 
+#include "CimXml/RequestWriter.h"
+#include "CimXml/ResponseReader.h"
+#include "CimXml/WireError.h"
 #include "Cli/Failure.h"
-#include "Host/CimXml/RequestWriter.h"
-#include "Host/CimXml/ResponseReader.h"
-#include "Host/CimXml/WireError.h"
 
 namespace cli {
 

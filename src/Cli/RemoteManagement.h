@@ -3,10 +3,10 @@
 #include <string>
 #include <vector>
 
+#include "CimXml/Request.h"
+#include "CimXml/Response.h"
 #include "Cli/HttpClient.h"
 #include "Cli/Management.h"
-#include "Host/CimXml/Request.h"
-#include "Host/CimXml/Response.h"
 
 namespace cli {
 

@@ -5,7 +5,7 @@
 #include <string_view>
 #include <vector>
 
-#include "Framework/CimRequests.h"
+#include "Framework/Requests/CimRequests.h"
 
 /// Reading properties of instances as plain values; what is null, absent or of another type reads as empty or
 /// 0.

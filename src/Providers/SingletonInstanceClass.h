@@ -3,7 +3,7 @@
 #include <memory>
 #include <string>
 
-#include "Framework/CimClass.h"
+#include "Framework/Classes/CimClass.h"
 #include "Utils/Debug.h"
 #include "Utils/Log.h"
 

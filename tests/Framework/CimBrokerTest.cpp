@@ -1,11 +1,11 @@
-#include "Framework/CimBroker.h"
+#include "Framework/Classes/CimBroker.h"
 
 #include <gtest/gtest.h>
 
 #include <future>
 #include <thread>
 
-#include "Framework/RequestScope.h"
+#include "Framework/Classes/RequestScope.h"
 #include "Support/TestModel.h"
 
 namespace {

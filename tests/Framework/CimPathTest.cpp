@@ -1,4 +1,4 @@
-#include "Framework/CimPath.h"
+#include "Framework/Model/CimPath.h"
 
 #include <gtest/gtest.h>
 

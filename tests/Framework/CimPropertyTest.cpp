@@ -1,6 +1,6 @@
 #include <gtest/gtest.h>
 
-#include "Framework/CimError.h"
+#include "Framework/Model/CimError.h"
 #include "Support/TestModel.h"
 
 namespace {

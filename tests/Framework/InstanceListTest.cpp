@@ -1,12 +1,12 @@
-#include "Framework/InstanceList.h"
+#include "Framework/Classes/InstanceList.h"
 
 #include <gtest/gtest.h>
 #include <unistd.h>
 
 #include <cstdlib>
 
-#include "Framework/CimAgent.h"
-#include "Framework/Retirement.h"
+#include "Framework/Classes/CimAgent.h"
+#include "Framework/Classes/Retirement.h"
 #include "Support/TestModel.h"
 
 namespace {

@@ -1,12 +1,12 @@
 #include <string>
 
+#include "CimXml/RequestReader.h"
+#include "CimXml/RequestWriter.h"
+#include "CimXml/ResponseReader.h"
+#include "CimXml/ResponseWriter.h"
+#include "CimXml/WireError.h"
+#include "CimXml/XmlGuard.h"
 #include "Fuzz/Require.h"
-#include "Host/CimXml/RequestReader.h"
-#include "Host/CimXml/RequestWriter.h"
-#include "Host/CimXml/ResponseReader.h"
-#include "Host/CimXml/ResponseWriter.h"
-#include "Host/CimXml/WireError.h"
-#include "Host/CimXml/XmlGuard.h"
 
 namespace {
 

@@ -1,8 +1,8 @@
 #include <algorithm>
 
 #include "Fuzz/Require.h"
-#include "MidAPI/ImagePreparation.h"
-#include "MidAPI/OptionRomWriter.h"
+#include "MidAPI/Image/ImagePreparation.h"
+#include "MidAPI/Image/OptionRomWriter.h"
 
 namespace {
 

@@ -2,9 +2,9 @@
 
 #include <gtest/gtest.h>
 
-#include "Host/CimXml/ResponseWriter.h"
+#include "CimXml/ResponseWriter.h"
+#include "CimXml/WireCheck.h"
 #include "Host/Operations/ProviderNamespace.h"
-#include "Host/WireCheck.h"
 #include "Support/TestModel.h"
 
 namespace {

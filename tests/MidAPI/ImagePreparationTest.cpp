@@ -1,8 +1,8 @@
-#include "MidAPI/ImagePreparation.h"
+#include "MidAPI/Image/ImagePreparation.h"
 
 #include <gtest/gtest.h>
 
-#include "MidAPI/OptionRomWriter.h"
+#include "MidAPI/Image/OptionRomWriter.h"
 #include "MidAPI/ma.h"
 #include "Support/SimulatedAdapters.h"
 #include "Support/SyslogCapture.h"

@@ -1,4 +1,4 @@
-#include "MidAPI/OptionRom.h"
+#include "MidAPI/Image/OptionRom.h"
 
 #include <gtest/gtest.h>
 
@@ -6,8 +6,8 @@
 #include <functional>
 #include <numeric>
 
-#include "MidAPI/ByteView.h"
-#include "MidAPI/OptionRomWriter.h"
+#include "MidAPI/Image/ByteView.h"
+#include "MidAPI/Image/OptionRomWriter.h"
 #include "Support/TestRoms.h"
 
 namespace {

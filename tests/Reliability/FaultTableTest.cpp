@@ -1,7 +1,7 @@
 // Every call that an update makes fails, throws or stalls, one at a time.
 #include <thread>
 
-#include "Framework/Retirement.h"
+#include "Framework/Classes/Retirement.h"
 #include "Providers/SoftwareUpdate/UpdateTest.h"
 #include "Reliability/Effort.h"
 #include "Reliability/Interposed.h"

@@ -5,8 +5,8 @@
 #include <random>
 #include <thread>
 
-#include "Framework/InstanceRange.h"
-#include "Framework/RequestScope.h"
+#include "Framework/Classes/InstanceRange.h"
+#include "Framework/Classes/RequestScope.h"
 #include "Providers/SoftwareUpdate/JobThread.h"
 #include "Providers/SoftwareUpdate/UpdateTest.h"
 #include "Reliability/Effort.h"

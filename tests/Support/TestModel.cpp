@@ -2,7 +2,7 @@
 
 #include <numeric>
 
-#include "Framework/CimError.h"
+#include "Framework/Model/CimError.h"
 
 namespace test {
 

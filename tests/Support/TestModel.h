@@ -3,9 +3,9 @@
 #include <atomic>
 #include <string>
 
-#include "Framework/CimBroker.h"
-#include "Framework/CimProperties.h"
-#include "Framework/CimPropertyRef.h"
+#include "Framework/Classes/CimBroker.h"
+#include "Framework/Model/CimProperties.h"
+#include "Framework/Model/CimPropertyRef.h"
 
 namespace test {
 

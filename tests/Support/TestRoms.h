@@ -5,8 +5,8 @@
 #include <string_view>
 #include <vector>
 
-#include "MidAPI/OptionRom.h"
-#include "MidAPI/OptionRomWriter.h"
+#include "MidAPI/Image/OptionRom.h"
+#include "MidAPI/Image/OptionRomWriter.h"
 
 namespace test {
 

@@ -8,7 +8,7 @@
 #include <filesystem>
 #include <thread>
 
-#include "Host/WireCheck.h"
+#include "CimXml/WireCheck.h"
 #include "System/HeldFlash.h"
 #include "System/RawConnection.h"
 #include "System/RunningDaemon.h"

@@ -8,7 +8,7 @@
 #include <random>
 #include <thread>
 
-#include "Host/WireCheck.h"
+#include "CimXml/WireCheck.h"
 #include "System/RawConnection.h"
 #include "System/RunningDaemon.h"
 

@@ -2,7 +2,7 @@
 
 #include <cstdint>
 
-#include "Framework/CimType.h"
+#include "Framework/Model/CimType.h"
 
 namespace host {
 

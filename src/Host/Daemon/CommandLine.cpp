@@ -5,7 +5,7 @@
 #include <CLI/CLI.hpp>
 #include <iostream>
 
-#include "Framework/ProviderLibraries.h"
+#include "Framework/Requests/ProviderLibraries.h"
 #include "Host/Daemon/SettingsField.h"
 
 namespace host {

@@ -1,6 +1,6 @@
 #include "Host/Daemon/Daemon.h"
 
-#include "Framework/Retirement.h"
+#include "Framework/Classes/Retirement.h"
 #include "Host/Authentication/PamChecker.h"
 #include "Host/Authentication/UsersFile.h"
 #include "Host/Daemon/Providers.h"

@@ -4,7 +4,7 @@
 #include <optional>
 #include <string>
 
-#include "Framework/ProviderLibraries.h"
+#include "Framework/Requests/ProviderLibraries.h"
 #include "Host/Server/HttpServer.h"
 #include "Host/Settings.h"
 #include "Utils/Os/Linux/LinuxOSLocker.h"

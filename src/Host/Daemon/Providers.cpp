@@ -3,7 +3,7 @@
 #include <stdexcept>
 #include <system_error>
 
-#include "Framework/CimBroker.h"
+#include "Framework/Classes/CimBroker.h"
 #include "Host/Daemon/Report.h"
 
 namespace host {

@@ -2,7 +2,7 @@
 
 #include <string>
 
-#include "Framework/ProviderLibraries.h"
+#include "Framework/Requests/ProviderLibraries.h"
 
 namespace host {
 

@@ -1,6 +1,6 @@
 #pragma once
 
-#include "Host/CimXml/Response.h"
+#include "CimXml/Response.h"
 
 namespace host {
 

@@ -4,8 +4,8 @@
 #include <memory>
 #include <vector>
 
-#include "Host/CimXml/Request.h"
-#include "Host/CimXml/Response.h"
+#include "CimXml/Request.h"
+#include "CimXml/Response.h"
 #include "Host/Operations/NamespaceModel.h"
 #include "Host/Operations/Operation.h"
 #include "Host/Operations/PullContexts.h"

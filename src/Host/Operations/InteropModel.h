@@ -3,7 +3,7 @@
 #include <string>
 #include <vector>
 
-#include "Framework/CimRequests.h"
+#include "Framework/Requests/CimRequests.h"
 
 namespace host {
 

@@ -4,7 +4,7 @@
 #include <string>
 #include <string_view>
 
-#include "Host/CimXml/Response.h"
+#include "CimXml/Response.h"
 #include "Host/Operations/NamespaceModel.h"
 #include "Host/Operations/Parameters.h"
 #include "Host/Operations/PullContexts.h"

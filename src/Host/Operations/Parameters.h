@@ -6,8 +6,8 @@
 #include <string>
 #include <string_view>
 
-#include "Framework/CimRequests.h"
-#include "Host/CimXml/Request.h"
+#include "CimXml/Request.h"
+#include "Framework/Requests/CimRequests.h"
 
 namespace host {
 

@@ -2,7 +2,7 @@
 
 #include <algorithm>
 
-#include "Host/CimXml/ValueReader.h"
+#include "CimXml/ValueReader.h"
 
 namespace host {
 

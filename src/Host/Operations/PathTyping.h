@@ -1,6 +1,6 @@
 #pragma once
 
-#include "Host/CimXml/Request.h"
+#include "CimXml/Request.h"
 #include "Host/Operations/NamespaceModel.h"
 
 namespace host {

@@ -4,7 +4,7 @@
 #include <map>
 #include <string>
 
-#include "Host/CimXml/Response.h"
+#include "CimXml/Response.h"
 #include "Utils/Os/Linux/Thread.h"
 #include "Utils/ThreadAnnotations.h"
 

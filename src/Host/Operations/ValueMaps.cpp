@@ -1,6 +1,6 @@
 #include "Host/Operations/ValueMaps.h"
 
-#include "Framework/SchemaQualifiers.h"
+#include "Framework/Model/SchemaQualifiers.h"
 
 namespace host {
 

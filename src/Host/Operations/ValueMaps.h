@@ -3,7 +3,7 @@
 #include <string>
 #include <vector>
 
-#include "Host/CimXml/Response.h"
+#include "CimXml/Response.h"
 
 namespace host {
 

@@ -1,8 +1,8 @@
 #include "Host/Server/CimHandler.h"
 
-#include "Host/CimXml/RequestReader.h"
-#include "Host/CimXml/ResponseWriter.h"
-#include "Host/CimXml/WireError.h"
+#include "CimXml/RequestReader.h"
+#include "CimXml/ResponseWriter.h"
+#include "CimXml/WireError.h"
 #include "Utils/Log.h"
 
 namespace host {

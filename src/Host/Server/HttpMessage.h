@@ -6,7 +6,7 @@
 #include <utility>
 #include <vector>
 
-#include "Host/CimXml/Headers.h"
+#include "CimXml/Headers.h"
 
 namespace host {
 

@@ -2,8 +2,8 @@
 
 #include <charconv>
 
-#include "Framework/CimType.h"
-#include "Host/CimXml/WireError.h"
+#include "CimXml/WireError.h"
+#include "Framework/Model/CimType.h"
 
 namespace host {
 

@@ -6,7 +6,7 @@
 #include <limits>
 
 #include "MidAPI/AdapterError.h"
-#include "MidAPI/OptionRom.h"
+#include "MidAPI/Image/OptionRom.h"
 #include "MidAPI/Simulator/FlashFiles.h"
 #include "MidAPI/Simulator/TomlTable.h"
 #include "MidAPI/Simulator/WholeFile.h"

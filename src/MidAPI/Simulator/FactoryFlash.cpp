@@ -1,6 +1,6 @@
 #include "MidAPI/AdapterError.h"
-#include "MidAPI/OptionRom.h"
-#include "MidAPI/OptionRomWriter.h"
+#include "MidAPI/Image/OptionRom.h"
+#include "MidAPI/Image/OptionRomWriter.h"
 #include "MidAPI/Simulator/AdapterDescription.h"
 #include "MidAPI/Simulator/FlashFiles.h"
 #include "MidAPI/Simulator/WholeFile.h"

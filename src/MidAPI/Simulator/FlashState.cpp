@@ -3,7 +3,7 @@
 #include <algorithm>
 #include <string_view>
 
-#include "MidAPI/ByteView.h"
+#include "MidAPI/Image/ByteView.h"
 
 namespace ma {
 namespace {

@@ -5,8 +5,8 @@
 #include <chrono>
 #include <thread>
 
-#include "MidAPI/ImagePreparation.h"
-#include "MidAPI/OptionRomWriter.h"
+#include "MidAPI/Image/ImagePreparation.h"
+#include "MidAPI/Image/OptionRomWriter.h"
 #include "Utils/Log.h"
 
 namespace ma {

@@ -7,7 +7,7 @@
 #include <vector>
 
 #include "MidAPI/AdapterTypes.h"
-#include "MidAPI/OptionRom.h"
+#include "MidAPI/Image/OptionRom.h"
 #include "MidAPI/Simulator/AdapterDescription.h"
 #include "MidAPI/Simulator/Fault.h"
 #include "MidAPI/Simulator/FlashStore.h"

@@ -1,6 +1,6 @@
 #pragma once
 
-#include "Framework/CimProperties.h"
+#include "Framework/Model/CimProperties.h"
 #include "Providers/Schema/CIM_LogicalDevice.h"
 #include "Utils/Export.h"
 

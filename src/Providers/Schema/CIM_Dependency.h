@@ -1,6 +1,6 @@
 #pragma once
 
-#include "Framework/CimInstance.h"
+#include "Framework/Model/CimInstance.h"
 #include "Providers/Schema/CimPropertyRefT.h"
 #include "Utils/Export.h"
 

@@ -1,7 +1,7 @@
 #pragma once
 
-#include "Framework/CimInstance.h"
-#include "Framework/CimProperties.h"
+#include "Framework/Model/CimInstance.h"
+#include "Framework/Model/CimProperties.h"
 #include "Providers/Schema/CimPropertyRefT.h"
 #include "Utils/Export.h"
 

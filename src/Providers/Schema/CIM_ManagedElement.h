@@ -1,7 +1,7 @@
 #pragma once
 
-#include "Framework/CimInstance.h"
-#include "Framework/CimProperties.h"
+#include "Framework/Model/CimInstance.h"
+#include "Framework/Model/CimProperties.h"
 #include "Utils/Export.h"
 
 /// DMTF CIM_ManagedElement: root of everything that can be managed.

@@ -1,6 +1,6 @@
 #pragma once
 
-#include "Framework/CimProperties.h"
+#include "Framework/Model/CimProperties.h"
 #include "Providers/Schema/CIM_LogicalElement.h"
 #include "Utils/Export.h"
 

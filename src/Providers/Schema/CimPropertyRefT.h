@@ -1,6 +1,6 @@
 #pragma once
 
-#include "Framework/CimPropertyRef.h"
+#include "Framework/Model/CimPropertyRef.h"
 #include "Utils/Export.h"
 
 class QUENX_EXPORT CIM_Capabilities;

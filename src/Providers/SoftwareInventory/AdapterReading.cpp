@@ -1,6 +1,6 @@
 #include "Providers/SoftwareInventory/AdapterReading.h"
 
-#include "MidAPI/OptionRom.h"
+#include "MidAPI/Image/OptionRom.h"
 #include "MidAPI/ma.h"
 #include "Utils/Exception.h"
 

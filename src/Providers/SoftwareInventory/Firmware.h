@@ -5,7 +5,7 @@
 #include <string>
 #include <vector>
 
-#include "MidAPI/OptionRom.h"
+#include "MidAPI/Image/OptionRom.h"
 #include "Providers/InventoryInterfaces.h"
 #include "Providers/SoftwareInventory/AdapterReading.h"
 

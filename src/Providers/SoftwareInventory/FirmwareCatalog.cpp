@@ -2,8 +2,8 @@
 
 #include <sys/stat.h>
 
-#include "MidAPI/OptionRom.h"
-#include "MidAPI/RomLayout.h"
+#include "MidAPI/Image/OptionRom.h"
+#include "MidAPI/Image/RomLayout.h"
 #include "Utils/Log.h"
 #include "Utils/Os/Linux/SMASHv2Config.h"
 #include "Utils/Os/Linux/linux.h"

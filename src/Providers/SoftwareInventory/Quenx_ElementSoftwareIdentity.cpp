@@ -3,8 +3,8 @@
 #include <map>
 #include <memory>
 
-#include "Framework/CimBroker.h"
-#include "Framework/InstanceRange.h"
+#include "Framework/Classes/CimBroker.h"
+#include "Framework/Classes/InstanceRange.h"
 #include "MidAPI/ma.h"
 #include "Providers/SoftwareInventory/Quenx_EthernetPort.h"
 #include "Providers/SoftwareInventory/Quenx_SoftwareIdentity.h"

@@ -1,6 +1,6 @@
 #pragma once
 
-#include "Framework/CimClass.h"
+#include "Framework/Classes/CimClass.h"
 #include "Providers/Schema/CIM_ElementSoftwareIdentity.h"
 
 /// What is installed (Antecedent) on a port (Dependent).

@@ -1,6 +1,6 @@
 #pragma once
 
-#include "Framework/CimClass.h"
+#include "Framework/Classes/CimClass.h"
 #include "Providers/InventoryInterfaces.h"
 #include "Providers/Schema/CIM_PortController.h"
 #include "Providers/SoftwareInventory/AdapterReading.h"

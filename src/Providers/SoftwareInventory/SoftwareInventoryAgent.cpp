@@ -1,6 +1,6 @@
 #include "Providers/SoftwareInventory/SoftwareInventoryAgent.h"
 
-#include "Framework/CimBroker.h"
+#include "Framework/Classes/CimBroker.h"
 #include "Providers/SoftwareInventory/Quenx_ElementSoftwareIdentity.h"
 #include "Providers/SoftwareInventory/Quenx_EthernetPort.h"
 #include "Providers/SoftwareInventory/Quenx_EthernetPortRegisteredProfile.h"

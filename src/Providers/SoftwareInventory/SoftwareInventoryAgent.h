@@ -1,6 +1,6 @@
 #pragma once
 
-#include "Framework/CimAgent.h"
+#include "Framework/Classes/CimAgent.h"
 
 namespace core {
 

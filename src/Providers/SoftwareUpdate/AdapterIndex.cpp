@@ -1,6 +1,6 @@
 #include "Providers/SoftwareUpdate/AdapterIndex.h"
 
-#include "Framework/CimBroker.h"
+#include "Framework/Classes/CimBroker.h"
 
 AdapterIndex::AdapterIndex()
     : m_portInstances(core::GetCimBroker()->getInstances("Quenx_EthernetPort", "")),

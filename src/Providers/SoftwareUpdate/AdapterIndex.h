@@ -6,7 +6,7 @@
 #include <utility>
 #include <vector>
 
-#include "Framework/InstanceRange.h"
+#include "Framework/Classes/InstanceRange.h"
 #include "Providers/InventoryInterfaces.h"
 #include "Providers/Schema/CIM_ManagedElement.h"
 

@@ -1,6 +1,6 @@
 #pragma once
 
-#include "Framework/CimClass.h"
+#include "Framework/Classes/CimClass.h"
 #include "Utils/Singleton.h"
 
 /// How the installation methods reach the job registry. The registry owns its factory; constructing it makes

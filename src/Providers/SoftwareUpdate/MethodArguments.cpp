@@ -1,7 +1,7 @@
 #include "Providers/SoftwareUpdate/MethodArguments.h"
 
-#include "Framework/CimProperties.h"
-#include "Framework/CimPropertyRef.h"
+#include "Framework/Model/CimProperties.h"
+#include "Framework/Model/CimPropertyRef.h"
 #include "Providers/SoftwareUpdate/UpdateExceptions.h"
 #include "Utils/Utils.h"
 

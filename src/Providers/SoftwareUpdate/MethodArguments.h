@@ -4,8 +4,8 @@
 #include <string>
 #include <vector>
 
-#include "Framework/CimPath.h"
-#include "Framework/CimPropertyList.h"
+#include "Framework/Model/CimPath.h"
+#include "Framework/Model/CimPropertyList.h"
 
 /// How the methods read their arguments. Every operation throws utils::EUnspecifiedError for an argument that
 /// is not there, or is of another type than declared: "Expected %s argument".

@@ -1,6 +1,6 @@
 #include "Providers/SoftwareUpdate/Quenx_AffectedJobElement.h"
 
-#include "Framework/CimBroker.h"
+#include "Framework/Classes/CimBroker.h"
 #include "Providers/SoftwareUpdate/AdapterIndex.h"
 #include "Providers/SoftwareUpdate/Quenx_ConcreteJob.h"
 #include "Providers/SoftwareUpdate/Rebuild.h"

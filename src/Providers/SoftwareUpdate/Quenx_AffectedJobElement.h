@@ -1,6 +1,6 @@
 #pragma once
 
-#include "Framework/CimClass.h"
+#include "Framework/Classes/CimClass.h"
 #include "Providers/Schema/CIM_AffectedJobElement.h"
 
 /// A job updates a port, and so the card that carries it.

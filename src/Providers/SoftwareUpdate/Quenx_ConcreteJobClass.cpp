@@ -1,8 +1,8 @@
 #include "Providers/SoftwareUpdate/Quenx_ConcreteJobClass.h"
 
-#include "Framework/CimBroker.h"
-#include "Framework/InstanceRange.h"
-#include "Framework/RequestScope.h"
+#include "Framework/Classes/CimBroker.h"
+#include "Framework/Classes/InstanceRange.h"
+#include "Framework/Classes/RequestScope.h"
 #include "Providers/SoftwareUpdate/AdapterClaim.h"
 #include "Providers/SoftwareUpdate/VerifyJobResult.h"
 #include "Utils/Debug.h"

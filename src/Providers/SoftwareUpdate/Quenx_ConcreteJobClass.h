@@ -4,7 +4,7 @@
 #include <string>
 #include <vector>
 
-#include "Framework/CimClass.h"
+#include "Framework/Classes/CimClass.h"
 #include "Providers/SoftwareUpdate/ConcreteJobFactory.h"
 #include "Providers/SoftwareUpdate/Quenx_ConcreteJob.h"
 

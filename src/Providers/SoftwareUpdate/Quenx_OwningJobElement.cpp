@@ -1,6 +1,6 @@
 #include "Providers/SoftwareUpdate/Quenx_OwningJobElement.h"
 
-#include "Framework/CimBroker.h"
+#include "Framework/Classes/CimBroker.h"
 #include "Providers/Schema/CIM_Job.h"
 #include "Providers/Schema/CIM_ManagedElement.h"
 #include "Providers/SoftwareUpdate/Rebuild.h"

@@ -1,6 +1,6 @@
 #pragma once
 
-#include "Framework/CimClass.h"
+#include "Framework/Classes/CimClass.h"
 #include "Providers/Schema/CIM_OwningJobElement.h"
 
 /// The service owns a job.

@@ -2,7 +2,7 @@
 
 #include <algorithm>
 
-#include "Framework/CimBroker.h"
+#include "Framework/Classes/CimBroker.h"
 #include "MidAPI/ma.h"
 #include "Providers/Schema/CIM_Service.h"
 #include "Providers/SoftwareUpdate/AdapterIndex.h"

@@ -1,6 +1,6 @@
 #pragma once
 
-#include "Framework/CimClass.h"
+#include "Framework/Classes/CimClass.h"
 #include "Providers/Schema/CIM_ServiceAffectsElement.h"
 
 /// The service can update a port, its card, or a firmware image can be installed by it.

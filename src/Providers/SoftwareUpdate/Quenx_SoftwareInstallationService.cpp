@@ -3,7 +3,7 @@
 #include <algorithm>
 #include <optional>
 
-#include "Framework/RequestScope.h"
+#include "Framework/Classes/RequestScope.h"
 #include "Providers/SoftwareUpdate/InstallOptions.h"
 #include "Providers/SoftwareUpdate/InstanceLookup.h"
 #include "Providers/SoftwareUpdate/MethodArguments.h"

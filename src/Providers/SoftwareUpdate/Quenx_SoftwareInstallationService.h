@@ -3,7 +3,7 @@
 #include <string>
 #include <vector>
 
-#include "Framework/CimClass.h"
+#include "Framework/Classes/CimClass.h"
 #include "Providers/Schema/CIM_SoftwareInstallationService.h"
 #include "Providers/SingletonInstanceClass.h"
 

@@ -1,6 +1,6 @@
 #include "Providers/SoftwareUpdate/Quenx_SoftwareUpdateElementCapabilities.h"
 
-#include "Framework/CimBroker.h"
+#include "Framework/Classes/CimBroker.h"
 #include "Providers/Schema/CIM_Capabilities.h"
 #include "Providers/Schema/CIM_ManagedElement.h"
 #include "Providers/SoftwareUpdate/ServiceLookup.h"

@@ -1,6 +1,6 @@
 #include "Providers/SoftwareUpdate/Quenx_SoftwareUpdateElementConformsToProfile.h"
 
-#include "Framework/CimBroker.h"
+#include "Framework/Classes/CimBroker.h"
 #include "Providers/Schema/CIM_RegisteredProfile.h"
 #include "Providers/Schema/CIM_SoftwareInstallationService.h"
 #include "Providers/SoftwareUpdate/ProfileNames.h"

@@ -1,6 +1,6 @@
 #pragma once
 
-#include "Framework/CimClass.h"
+#include "Framework/Classes/CimClass.h"
 #include "Providers/Schema/CIM_ElementConformsToProfile.h"
 
 /// The service conforms to the Software Update profile.

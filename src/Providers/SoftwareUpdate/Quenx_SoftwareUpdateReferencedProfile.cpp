@@ -1,6 +1,6 @@
 #include "Providers/SoftwareUpdate/Quenx_SoftwareUpdateReferencedProfile.h"
 
-#include "Framework/CimBroker.h"
+#include "Framework/Classes/CimBroker.h"
 #include "Providers/Schema/CIM_RegisteredProfile.h"
 #include "Providers/SoftwareUpdate/ProfileNames.h"
 #include "Providers/SoftwareUpdate/Rebuild.h"

@@ -1,6 +1,6 @@
 #pragma once
 
-#include "Framework/CimClass.h"
+#include "Framework/Classes/CimClass.h"
 #include "Providers/Schema/CIM_ReferencedProfile.h"
 
 /// The Ethernet port profile refers to the Software Update profile.

@@ -1,6 +1,6 @@
 #include "Providers/SoftwareUpdate/ServiceLookup.h"
 
-#include "Framework/CimBroker.h"
+#include "Framework/Classes/CimBroker.h"
 #include "Utils/Exception.h"
 
 utils::SafeList<core::CimInstance*>::Iterator allServices() {

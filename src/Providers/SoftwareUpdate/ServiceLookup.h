@@ -1,6 +1,6 @@
 #pragma once
 
-#include "Framework/InstanceRange.h"
+#include "Framework/Classes/InstanceRange.h"
 
 /// Enumerates the installation services, whoever provides them.
 utils::SafeList<core::CimInstance*>::Iterator allServices();

@@ -1,6 +1,6 @@
 #include "Providers/SoftwareUpdate/SoftwareUpdateAgent.h"
 
-#include "Framework/CimBroker.h"
+#include "Framework/Classes/CimBroker.h"
 #include "Providers/SoftwareUpdate/Quenx_AffectedJobElement.h"
 #include "Providers/SoftwareUpdate/Quenx_ConcreteJobClass.h"
 #include "Providers/SoftwareUpdate/Quenx_OwningJobElement.h"

@@ -2,7 +2,7 @@
 
 #include <string>
 
-#include "Framework/CimAgent.h"
+#include "Framework/Classes/CimAgent.h"
 
 namespace core {
 

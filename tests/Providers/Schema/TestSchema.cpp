@@ -6,8 +6,8 @@
 #include <set>
 #include <sstream>
 
-#include "Framework/CimBroker.h"
-#include "Framework/ClassDeclaration.h"
+#include "Framework/Classes/CimBroker.h"
+#include "Framework/Model/ClassDeclaration.h"
 #include "Providers/Schema/CIM_SoftwareInstallationService.h"
 #include "Providers/Schema/SchemaTable.h"
 #include "Support/ProviderLibrary.h"

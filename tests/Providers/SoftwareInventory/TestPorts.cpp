@@ -1,7 +1,7 @@
 #include <gtest/gtest.h>
 
-#include "Framework/InstanceRange.h"
-#include "Framework/RequestScope.h"
+#include "Framework/Classes/InstanceRange.h"
+#include "Framework/Classes/RequestScope.h"
 #include "Providers/SoftwareUpdate/UpdateTest.h"
 #include "Utils/Os/Linux/linux.h"
 

@@ -2,7 +2,7 @@
 
 #include <thread>
 
-#include "Framework/Retirement.h"
+#include "Framework/Classes/Retirement.h"
 #include "Providers/SoftwareUpdate/Quenx_ConcreteJobClass.h"
 #include "Providers/SoftwareUpdate/UpdateTest.h"
 #include "Providers/SoftwareUpdate/VerifyJobResult.h"

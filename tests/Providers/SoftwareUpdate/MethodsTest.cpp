@@ -3,7 +3,7 @@
 
 #include <set>
 
-#include "MidAPI/RomLayout.h"
+#include "MidAPI/Image/RomLayout.h"
 #include "Providers/SoftwareUpdate/UpdateTest.h"
 #include "Support/TestRoms.h"
 

@@ -6,7 +6,7 @@
 #include <string>
 #include <vector>
 
-#include "Framework/CimRequests.h"
+#include "Framework/Requests/CimRequests.h"
 
 namespace test {
 

@@ -2,7 +2,7 @@
 
 #include <algorithm>
 
-#include "Framework/Retirement.h"
+#include "Framework/Classes/Retirement.h"
 #include "Support/TestRoms.h"
 
 namespace test {

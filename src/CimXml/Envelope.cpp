@@ -1,0 +1,64 @@
+#include "CimXml/Envelope.h"
+
+#include "CimXml/WireError.h"
+#include "CimXml/XmlElement.h"
+
+namespace cimxml {
+
+namespace {
+
+void checkVersion(const pugi::xml_node& element, const char* attribute, std::string_view major,
+                  WireFault fault) {
+    const std::string version = requiredAttribute(element, attribute);
+    if (!version.starts_with(major)) {
+        throw WireError(fault,
+                        std::string(attribute) + " is " + version + ", not " + std::string(major) + "x");
+    }
+}
+
+/// The call or response, after the correlators that may stand in front of it (DSP0201 5.2.3.2).
+pugi::xml_node lastElement(const pugi::xml_node& wrapper) {
+    pugi::xml_node content;
+    for (const pugi::xml_node& child : childElements(wrapper)) {
+        if (isElement(child, "CORRELATOR") && !content) continue;
+        if (content) refuseElement(wrapper, "must hold one call or response");
+        content = child;
+    }
+    if (!content) refuseElement(wrapper, "is empty");
+    return content;
+}
+
+}  // namespace
+
+Envelope openEnvelope(pugi::xml_document& document, std::string_view bytes, std::string_view wrapper) {
+    parseDocument(document, bytes);
+    const pugi::xml_node root = document.document_element();
+    expectElement(root, "CIM");
+    checkVersion(root, "CIMVERSION", "2.", WireFault::UnsupportedCimVersion);
+    checkVersion(root, "DTDVERSION", "2.", WireFault::UnsupportedDtdVersion);
+    const pugi::xml_node message = onlyChild(root);
+    expectElement(message, "MESSAGE");
+    Envelope envelope;
+    envelope.messageId = requiredAttribute(message, "ID");
+    checkVersion(message, "PROTOCOLVERSION", "1.", WireFault::UnsupportedProtocol);
+    const pugi::xml_node wrapped = onlyChild(message);
+    if (isElement(wrapped, "MULTIREQ")) {
+        throw WireError(WireFault::MultipleRequests, "several requests in one message");
+    }
+    expectElement(wrapped, wrapper);
+    envelope.content = lastElement(wrapped);
+    return envelope;
+}
+
+void startEnvelope(XmlWriter& writer, std::string_view messageId, std::string_view wrapper) {
+    writer.raw("<?xml version=\"1.0\" encoding=\"utf-8\"?>\n<CIM CIMVERSION=\"2.0\" DTDVERSION=\"2.0\">");
+    writer.start("MESSAGE").attribute("ID", messageId).attribute("PROTOCOLVERSION", "1.0").content();
+    writer.open(wrapper);
+}
+
+void endEnvelope(XmlWriter& writer, std::string_view wrapper) {
+    writer.end(wrapper).end("MESSAGE").end("CIM");
+    writer.raw("\n");
+}
+
+}  // namespace cimxml

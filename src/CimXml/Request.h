@@ -1,0 +1,76 @@
+#pragma once
+
+#include <optional>
+#include <string>
+#include <variant>
+#include <vector>
+
+#include "Framework/Model/CimValue.h"
+
+namespace cimxml {
+
+/// A value as it stands in a message, before the declaration says of what type it is: null, one text, one
+/// reference, or an array of texts or references.
+struct RawValue {
+    std::optional<core::CimType> type;  ///< as the message says, if it does
+    std::variant<std::monostate, std::string, core::CimPath, std::vector<std::string>,
+                 std::vector<core::CimPath>>
+        data;
+    bool hasNullElement = false;  ///< an array with VALUE.NULL in it; the nulls are not in data
+
+    bool isNull() const { return data.index() == 0; }
+};
+
+/// A typed value in the form in which it is written.
+RawValue rawValueOf(const core::CimValue& value);
+
+struct RawArgument {
+    std::string name;
+    RawValue value;
+};
+
+/// A class, named where an operation takes a class or an instance.
+struct ClassName {
+    std::string name;
+};
+
+/// The instance that a client sends in order to create or modify one: only what names it is kept, since the
+/// classes served here are neither created nor modified from outside.
+struct InstanceBody {
+    std::string className;
+    std::optional<core::CimPath> path;  ///< given with a modification
+};
+
+/// What an intrinsic operation's parameter holds. Null is the same as a parameter that is not there.
+using ParameterValue = std::variant<std::monostate, std::string, std::vector<std::string>, ClassName,
+                                    core::CimPath, InstanceBody>;
+
+struct Parameter {
+    std::string name;
+    ParameterValue value;
+};
+
+/// A call of one of the operations of DSP0200 5.4.
+struct IntrinsicCall {
+    std::string operation;      ///< as the client wrote it
+    std::string namespaceName;  ///< without slashes at its ends
+    std::vector<Parameter> parameters;
+};
+
+/// A call of a method of a class. The object is an instance or, without keys, a class; its namespace is set.
+struct MethodCall {
+    std::string method;  ///< as the client wrote it
+    core::CimPath object;
+    bool isClass = false;  ///< named as a class, not as an instance without keys
+    std::vector<RawArgument> arguments;
+};
+
+struct Request {
+    std::string messageId;  ///< any text; goes back in the response
+    std::variant<IntrinsicCall, MethodCall> call;
+
+    /// The name of the operation or method, as the client wrote it.
+    const std::string& name() const;
+};
+
+}  // namespace cimxml

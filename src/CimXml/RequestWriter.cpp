@@ -1,0 +1,82 @@
+#include "CimXml/RequestWriter.h"
+
+#include "CimXml/Envelope.h"
+#include "CimXml/ValueWriter.h"
+
+namespace cimxml {
+
+namespace {
+
+struct RawWriter {
+    XmlWriter& writer;
+
+    void operator()(std::monostate) const {}
+    void operator()(const std::string& text) const { writer.open("VALUE").text(text).end("VALUE"); }
+    void operator()(const core::CimPath& path) const { writeReference(writer, path); }
+    void operator()(const std::vector<std::string>& texts) const { writeTexts(writer, texts); }
+    void operator()(const std::vector<core::CimPath>& paths) const {
+        writer.open("VALUE.REFARRAY");
+        for (const core::CimPath& path : paths)
+            writeReference(writer, path);
+        writer.end("VALUE.REFARRAY");
+    }
+};
+
+/// Intrinsic parameters name classes and instances without a namespace of their own.
+struct ParameterWriter {
+    XmlWriter& writer;
+
+    void operator()(std::monostate) const {}
+    void operator()(const std::string& text) const { RawWriter{writer}(text); }
+    void operator()(const std::vector<std::string>& texts) const { RawWriter{writer}(texts); }
+    void operator()(const ClassName& name) const {
+        writer.start("CLASSNAME").attribute("NAME", name.name).empty();
+    }
+    void operator()(const core::CimPath& path) const { writeInstanceName(writer, path); }
+    void operator()(const InstanceBody& body) const {
+        if (body.path) writer.open("VALUE.NAMEDINSTANCE");
+        if (body.path) writeInstanceName(writer, *body.path);
+        writer.start("INSTANCE").attribute("CLASSNAME", body.className).content().end("INSTANCE");
+        if (body.path) writer.end("VALUE.NAMEDINSTANCE");
+    }
+};
+
+struct CallWriter {
+    XmlWriter& writer;
+
+    void operator()(const IntrinsicCall& call) const {
+        writer.start("IMETHODCALL").attribute("NAME", call.operation).content();
+        writeNamespace(writer, call.namespaceName);
+        for (const Parameter& parameter : call.parameters) {
+            writer.start("IPARAMVALUE").attribute("NAME", parameter.name).content();
+            std::visit(ParameterWriter{writer}, parameter.value);
+            writer.end("IPARAMVALUE");
+        }
+        writer.end("IMETHODCALL");
+    }
+    void operator()(const MethodCall& call) const {
+        writer.start("METHODCALL").attribute("NAME", call.method).content();
+        writeLocalPath(writer, call.object);
+        for (const RawArgument& argument : call.arguments) {
+            writer.start("PARAMVALUE").attribute("NAME", argument.name);
+            if (argument.value.type) writer.attribute("PARAMTYPE", core::typeName(*argument.value.type));
+            writer.content();
+            std::visit(RawWriter{writer}, argument.value.data);
+            writer.end("PARAMVALUE");
+        }
+        writer.end("METHODCALL");
+    }
+};
+
+}  // namespace
+
+std::string writeRequest(const Request& request) {
+    std::string out;
+    XmlWriter writer(out);
+    startEnvelope(writer, request.messageId, "SIMPLEREQ");
+    std::visit(CallWriter{writer}, request.call);
+    endEnvelope(writer, "SIMPLEREQ");
+    return out;
+}
+
+}  // namespace cimxml

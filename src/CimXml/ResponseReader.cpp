@@ -1,0 +1,186 @@
+#include "CimXml/ResponseReader.h"
+
+#include <charconv>
+
+#include "CimXml/ClassReader.h"
+#include "CimXml/Envelope.h"
+#include "CimXml/ValueReader.h"
+#include "CimXml/XmlElement.h"
+
+namespace cimxml {
+
+namespace {
+
+constexpr KeyTyping kTyping = KeyTyping::ByAttributes;
+
+core::CimValue readTyped(const pugi::xml_node& element, const char* typeAttribute,
+                         std::optional<core::CimType> type, bool isArray) {
+    const auto value = typedValueOf(readValue(element, typeAttribute, kTyping), type, isArray);
+    if (!value) refuseElement(element, "holds no value of its type");
+    return *value;
+}
+
+core::PropertyValue readProperty(const pugi::xml_node& element) {
+    core::PropertyValue property;
+    property.name = requiredAttribute(element, "NAME");
+    if (isElement(element, "PROPERTY.REFERENCE")) {
+        property.value = readTyped(element, "TYPE", core::CimType::Reference, false);
+        property.referenceClass = element.attribute("REFERENCECLASS").value();
+        return property;
+    }
+    const bool isArray = isElement(element, "PROPERTY.ARRAY");
+    if (!isArray) expectElement(element, "PROPERTY");
+    property.value = readTyped(element, "TYPE", std::nullopt, isArray);
+    return property;
+}
+
+core::InstanceValue readInstance(const pugi::xml_node& element) {
+    expectElement(element, "INSTANCE");
+    core::InstanceValue instance;
+    instance.path = core::CimPath(requiredAttribute(element, "CLASSNAME"), {});
+    for (const pugi::xml_node& child : childElements(element)) {
+        if (!isElement(child, "QUALIFIER")) instance.properties.push_back(readProperty(child));
+    }
+    return instance;
+}
+
+void markKeys(core::InstanceValue& instance) {
+    for (core::PropertyValue& property : instance.properties) {
+        for (const core::CimKey& key : instance.path.getKeys()) {
+            if (core::sameName(key.name, property.name)) property.isKey = true;
+        }
+    }
+}
+
+/// VALUE.NAMEDINSTANCE, VALUE.OBJECTWITHPATH, VALUE.INSTANCEWITHPATH.
+core::InstanceValue readPlacedInstance(const pugi::xml_node& element) {
+    const std::vector<pugi::xml_node> parts = childElements(element);
+    if (parts.size() != 2) refuseElement(element, "must hold a path and an instance");
+    core::InstanceValue instance = readInstance(parts[1]);
+    instance.path = readObject(parts[0], kTyping).path;
+    markKeys(instance);
+    return instance;
+}
+
+struct KindOfElement {
+    std::string_view element;
+    ResultKind kind;
+};
+
+constexpr KindOfElement kKinds[] = {{"INSTANCE", ResultKind::Instance},
+                                    {"VALUE.NAMEDINSTANCE", ResultKind::NamedInstances},
+                                    {"VALUE.OBJECTWITHPATH", ResultKind::ObjectsWithPath},
+                                    {"VALUE.INSTANCEWITHPATH", ResultKind::InstancesWithPath},
+                                    {"INSTANCENAME", ResultKind::InstanceNames},
+                                    {"OBJECTPATH", ResultKind::ObjectPaths},
+                                    {"INSTANCEPATH", ResultKind::InstancePaths},
+                                    {"CLASS", ResultKind::Classes},
+                                    {"CLASSNAME", ResultKind::ClassNames},
+                                    {"QUALIFIER.DECLARATION", ResultKind::Qualifiers}};
+
+ResultKind kindOf(const pugi::xml_node& element) {
+    for (const KindOfElement& known : kKinds) {
+        if (isElement(element, known.element)) return known.kind;
+    }
+    refuseElement(element, "is no result that is known");
+}
+
+void readReturned(IntrinsicResult& result, const pugi::xml_node& element) {
+    result.kind = kindOf(element);
+    switch (result.kind) {
+        case ResultKind::Instance:
+            result.instances.push_back(readInstance(element));
+            break;
+        case ResultKind::NamedInstances:
+        case ResultKind::ObjectsWithPath:
+        case ResultKind::InstancesWithPath:
+            result.instances.push_back(readPlacedInstance(element));
+            break;
+        case ResultKind::InstanceNames:
+        case ResultKind::InstancePaths:
+            result.paths.push_back(readObject(element, kTyping).path);
+            break;
+        case ResultKind::ObjectPaths:
+            result.paths.push_back(readObject(onlyChild(element), kTyping).path);
+            break;
+        case ResultKind::Classes:
+            result.classes.push_back(readClass(element));
+            break;
+        case ResultKind::ClassNames:
+            result.classNames.push_back(requiredAttribute(element, "NAME"));
+            break;
+        default:
+            break;
+    }
+}
+
+core::Argument readOutput(const pugi::xml_node& element) {
+    expectElement(element, "PARAMVALUE");
+    const RawValue raw = readValue(element, "PARAMTYPE", kTyping);
+    const bool isArray = raw.data.index() > 2;
+    const auto value = typedValueOf(raw, std::nullopt, isArray);
+    if (!value) refuseElement(element, "holds no value of its type");
+    return {requiredAttribute(element, "NAME"), *value};
+}
+
+std::uint32_t readNumber(const pugi::xml_node& element, const std::string& text) {
+    std::uint32_t number = 0;
+    const auto [end, error] = std::from_chars(text.data(), text.data() + text.size(), number);
+    if (error != std::errc() || end != text.data() + text.size()) refuseElement(element, "is no number");
+    return number;
+}
+
+Failure readFailure(const pugi::xml_node& element) {
+    const std::uint32_t code = readNumber(element, requiredAttribute(element, "CODE"));
+    return {static_cast<core::CimStatus>(code), element.attribute("DESCRIPTION").value()};
+}
+
+IntrinsicResult readIntrinsic(const std::vector<pugi::xml_node>& parts) {
+    IntrinsicResult result;
+    for (const pugi::xml_node& part : parts) {
+        if (isElement(part, "IRETURNVALUE")) {
+            for (const pugi::xml_node& child : childElements(part))
+                readReturned(result, child);
+        } else {
+            result.outputs.push_back(readOutput(part));
+        }
+    }
+    return result;
+}
+
+ExtrinsicResult readExtrinsic(const std::vector<pugi::xml_node>& parts) {
+    ExtrinsicResult result;
+    for (const pugi::xml_node& part : parts) {
+        if (!isElement(part, "RETURNVALUE")) {
+            result.result.outputs.push_back(readOutput(part));
+            continue;
+        }
+        const auto type = core::typeByName(part.attribute("PARAMTYPE").value());
+        result.returnType = type.value_or(core::CimType::Uint32);
+        result.result.returnValue = readNumber(part, textOf(onlyChild(part)));
+    }
+    return result;
+}
+
+}  // namespace
+
+Response readResponse(std::string_view bytes) {
+    pugi::xml_document document;
+    const Envelope envelope = openEnvelope(document, bytes, "SIMPLERSP");
+    Response response;
+    response.messageId = envelope.messageId;
+    response.isMethod = isElement(envelope.content, "METHODRESPONSE");
+    if (!response.isMethod) expectElement(envelope.content, "IMETHODRESPONSE");
+    response.name = requiredAttribute(envelope.content, "NAME");
+    const std::vector<pugi::xml_node> parts = childElements(envelope.content);
+    if (!parts.empty() && isElement(parts.front(), "ERROR")) {
+        response.content = readFailure(parts.front());
+    } else if (response.isMethod) {
+        response.content = readExtrinsic(parts);
+    } else {
+        response.content = readIntrinsic(parts);
+    }
+    return response;
+}
+
+}  // namespace cimxml

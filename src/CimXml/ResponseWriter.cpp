@@ -1,0 +1,121 @@
+#include "CimXml/ResponseWriter.h"
+
+#include "CimXml/ClassWriter.h"
+#include "CimXml/Envelope.h"
+#include "CimXml/InstanceWriter.h"
+#include "CimXml/ValueWriter.h"
+
+namespace cimxml {
+
+namespace {
+
+/// Writes IRETURNVALUE of one result.
+class ReturnValueWriter {
+  public:
+    ReturnValueWriter(XmlWriter& writer, const IntrinsicResult& result, const std::string& host)
+        : m_writer(writer), m_result(result), m_host(host) {}
+
+    void write() const {
+        if (m_result.kind == ResultKind::Nothing) return;
+        m_writer.open("IRETURNVALUE");
+        for (const core::InstanceValue& instance : m_result.instances)
+            writeOne(instance);
+        for (const core::CimPath& path : m_result.paths)
+            writeOne(path);
+        for (const ClassElement& element : m_result.classes)
+            writeClass(m_writer, element);
+        for (const std::string& name : m_result.classNames) {
+            m_writer.start("CLASSNAME").attribute("NAME", name).empty();
+        }
+        for (const QualifierDeclaration& declaration : m_result.qualifiers) {
+            writeQualifierDeclaration(m_writer, declaration);
+        }
+        m_writer.end("IRETURNVALUE");
+    }
+
+  private:
+    void writeOne(const core::InstanceValue& instance) const {
+        const std::string_view wrapper = wrapperOfInstance();
+        if (!wrapper.empty()) {
+            m_writer.open(wrapper);
+            if (m_result.kind == ResultKind::NamedInstances) {
+                writeInstanceName(m_writer, instance.path);
+            } else {
+                writeInstancePath(m_writer, instance.path, m_host);
+            }
+        }
+        writeInstance(m_writer, instance, m_result.origins.get());
+        if (!wrapper.empty()) m_writer.end(wrapper);
+    }
+
+    void writeOne(const core::CimPath& path) const {
+        if (m_result.kind == ResultKind::InstanceNames) {
+            writeInstanceName(m_writer, path);
+            return;
+        }
+        const bool wrapped = m_result.kind == ResultKind::ObjectPaths;
+        if (wrapped) m_writer.open("OBJECTPATH");
+        writeInstancePath(m_writer, path, m_host);
+        if (wrapped) m_writer.end("OBJECTPATH");
+    }
+
+    std::string_view wrapperOfInstance() const {
+        switch (m_result.kind) {
+            case ResultKind::NamedInstances:
+                return "VALUE.NAMEDINSTANCE";
+            case ResultKind::ObjectsWithPath:
+                return "VALUE.OBJECTWITHPATH";
+            case ResultKind::InstancesWithPath:
+                return "VALUE.INSTANCEWITHPATH";
+            default:
+                return "";
+        }
+    }
+
+    XmlWriter& m_writer;
+    const IntrinsicResult& m_result;
+    const std::string& m_host;
+};
+
+/// Writes what is inside IMETHODRESPONSE or METHODRESPONSE.
+struct ContentWriter {
+    XmlWriter& writer;
+    const Response& response;
+
+    void operator()(const Failure& failure) const {
+        writer.start("ERROR").attribute("CODE", std::to_string(static_cast<int>(failure.status)));
+        writer.attribute("DESCRIPTION", failure.description).empty();
+    }
+    void operator()(const IntrinsicResult& result) const {
+        ReturnValueWriter(writer, result, response.host).write();
+        writeOutputs(result.outputs);
+    }
+    void operator()(const ExtrinsicResult& result) const {
+        writer.start("RETURNVALUE").attribute("PARAMTYPE", core::typeName(result.returnType)).content();
+        writer.open("VALUE").raw(std::to_string(result.result.returnValue)).end("VALUE").end("RETURNVALUE");
+        writeOutputs(result.result.outputs);
+    }
+
+  private:
+    void writeOutputs(const std::vector<core::Argument>& outputs) const {
+        for (const core::Argument& output : outputs) {
+            if (!output.value.isNull()) writeParamValue(writer, output);
+        }
+    }
+};
+
+}  // namespace
+
+std::string writeResponse(const Response& response) {
+    std::string out;
+    XmlWriter writer(out);
+    const std::string_view element = response.isMethod ? "METHODRESPONSE" : "IMETHODRESPONSE";
+    startEnvelope(writer, response.messageId, "SIMPLERSP");
+    writer.start(element).attribute("NAME", response.name).content();
+    std::visit(ContentWriter{writer, response}, response.content);
+    writer.end(element);
+    endEnvelope(writer, "SIMPLERSP");
+    return out;
+}
+
+}  // namespace cimxml

@@ -1,0 +1,125 @@
+#include "CimXml/XmlText.h"
+
+#include <array>
+
+namespace cimxml {
+
+namespace {
+
+enum class ByteKind : unsigned char { Plain, Special, Forbidden, Multi };
+
+constexpr std::array<ByteKind, 256> makeKinds() {
+    std::array<ByteKind, 256> kinds{};
+    for (std::size_t byte = 0; byte < kinds.size(); ++byte) {
+        if (byte >= 0x80) {
+            kinds[byte] = ByteKind::Multi;
+        } else if (byte < 0x20 && byte != '\t' && byte != '\n' && byte != '\r') {
+            kinds[byte] = ByteKind::Forbidden;
+        } else {
+            kinds[byte] = ByteKind::Plain;
+        }
+    }
+    for (const char special : {'&', '<', '>', '"'}) {
+        kinds[static_cast<unsigned char>(special)] = ByteKind::Special;
+    }
+    return kinds;
+}
+
+constexpr auto kKinds = makeKinds();
+
+ByteKind kindOf(char byte) {
+    return kKinds[static_cast<unsigned char>(byte)];
+}
+
+std::size_t sequenceLength(unsigned char lead) {
+    if (lead < 0x80) return 1;
+    if (lead >= 0xC2 && lead < 0xE0) return 2;
+    if (lead >= 0xE0 && lead < 0xF0) return 3;
+    if (lead >= 0xF0 && lead < 0xF5) return 4;
+    return 0;
+}
+
+std::string_view entityOf(char special) {
+    switch (special) {
+        case '&':
+            return "&amp;";
+        case '<':
+            return "&lt;";
+        case '>':
+            return "&gt;";
+        default:
+            return "&quot;";
+    }
+}
+
+/// The length of the run at the front that needs no change.
+std::size_t plainRun(std::string_view text) {
+    std::size_t length = 0;
+    while (length < text.size() && kindOf(text[length]) == ByteKind::Plain)
+        ++length;
+    return length;
+}
+
+}  // namespace
+
+bool isXmlCharacter(char32_t character) {
+    if (character < 0x20) return character == '\t' || character == '\n' || character == '\r';
+    if (character >= 0xD800 && character <= 0xDFFF) return false;
+    return character <= 0x10FFFF && character != 0xFFFE && character != 0xFFFF;
+}
+
+std::size_t xmlCharacterLength(std::string_view text) {
+    if (text.empty()) return 0;
+    const auto lead = static_cast<unsigned char>(text[0]);
+    const std::size_t length = sequenceLength(lead);
+    if (length == 0 || length > text.size()) return 0;
+    char32_t character = length == 1 ? lead : lead & (0x7FU >> length);
+    for (std::size_t i = 1; i < length; ++i) {
+        const auto next = static_cast<unsigned char>(text[i]);
+        if ((next & 0xC0U) != 0x80U) return 0;
+        character = (character << 6) | (next & 0x3FU);
+    }
+    constexpr char32_t kSmallest[] = {0, 0, 0x80, 0x800, 0x10000};
+    return character >= kSmallest[length] && isXmlCharacter(character) ? length : 0;
+}
+
+bool isXmlText(std::string_view text) {
+    while (!text.empty()) {
+        const ByteKind kind = kindOf(text[0]);
+        const std::size_t length = kind == ByteKind::Multi       ? xmlCharacterLength(text)
+                                   : kind == ByteKind::Forbidden ? 0
+                                   : kind == ByteKind::Special   ? 1
+                                                                 : plainRun(text);
+        if (length == 0) return false;
+        text.remove_prefix(length);
+    }
+    return true;
+}
+
+void appendEscaped(std::string& out, std::string_view text) {
+    while (!text.empty()) {
+        std::size_t length = 1;
+        switch (kindOf(text[0])) {
+            case ByteKind::Plain:
+                length = plainRun(text);
+                out.append(text.substr(0, length));
+                break;
+            case ByteKind::Special:
+                out.append(entityOf(text[0]));
+                break;
+            case ByteKind::Forbidden:
+                break;
+            case ByteKind::Multi:
+                if (const std::size_t known = xmlCharacterLength(text); known != 0) {
+                    length = known;
+                    out.append(text.substr(0, length));
+                } else {
+                    out.append("\xEF\xBF\xBD");
+                }
+                break;
+        }
+        text.remove_prefix(length);
+    }
+}
+
+}  // namespace cimxml

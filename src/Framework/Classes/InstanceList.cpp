@@ -1,0 +1,140 @@
+#include "Framework/Classes/InstanceList.h"
+
+#include <algorithm>
+
+#include "Framework/Classes/InstanceListLink.h"
+#include "Framework/Classes/RequestScope.h"
+#include "Framework/Classes/Retirement.h"
+
+namespace core {
+
+namespace {
+
+/// Walks a snapshot and keeps it. Instances deleted since it was taken are passed over.
+class SnapshotIterator : public InstanceList::IteratorImplementation {
+  public:
+    explicit SnapshotIterator(std::shared_ptr<const InstanceList::Snapshot> snapshot)
+        : m_snapshot(std::move(snapshot)) {}
+
+    CimInstance* next() override {
+        while (m_position < m_snapshot->size()) {
+            CimInstance* instance = (*m_snapshot)[m_position++].get();
+            if (!instance->isDeleted()) return instance;
+        }
+        return nullptr;
+    }
+
+    CimInstance* first() override {
+        m_position = 0;
+        return next();
+    }
+
+    std::size_t size() override { return m_snapshot->size(); }
+
+    std::unique_ptr<IteratorImplementation> clone() override {
+        return std::make_unique<SnapshotIterator>(m_snapshot);
+    }
+
+  private:
+    std::shared_ptr<const InstanceList::Snapshot> m_snapshot;
+    std::size_t m_position = 0;
+};
+
+void holdInScope(std::shared_ptr<const void> object) {
+    if (RequestScope* scope = RequestScope::current()) scope->hold(std::move(object));
+}
+
+}  // namespace
+
+void InstanceListLink::remove(const CimInstance* instance) {
+    const utils::Mutex::AutoLocker lock(m_mutex);
+    if (m_list != nullptr) m_list->remove(instance);
+}
+
+void InstanceListLink::close() {
+    const utils::Mutex::AutoLocker lock(m_mutex);
+    m_list = nullptr;
+}
+
+InstanceList::InstanceList() : m_link(std::make_shared<InstanceListLink>(this)) {}
+
+InstanceList::~InstanceList() {
+    m_link->close();
+    clear();
+}
+
+InstanceList::Iterator InstanceList::getElements() {
+    return getElements(false);
+}
+
+InstanceList::Iterator InstanceList::getElements(bool) {
+    auto taken = snapshot();
+    holdInScope(taken);
+    return Iterator(std::make_unique<SnapshotIterator>(std::move(taken)));
+}
+
+InstanceList::SharedSnapshot InstanceList::snapshot() {
+    const utils::Mutex::AutoLocker lock(getMutex());
+    if (m_cached == nullptr) m_cached = std::make_shared<const Snapshot>(m_held);
+    return m_cached;
+}
+
+void InstanceList::add(CimInstance* element) {
+    const std::shared_ptr<CimInstance> owned(element, InstanceRelease{});
+    element->m_list = m_link;
+    holdInScope(owned);
+    SharedSnapshot outdated;
+    const utils::Mutex::AutoLocker lock(getMutex());
+    m_held.push_back(owned);
+    try {
+        getStlList().push_back(element);
+    } catch (...) {
+        m_held.pop_back();
+        throw;
+    }
+    outdated.swap(m_cached);
+}
+
+void InstanceList::clear() {
+    // What is let go of is destroyed after the lock is released.
+    Snapshot released;
+    SharedSnapshot outdated;
+    const utils::Mutex::AutoLocker lock(getMutex());
+    released.swap(m_held);
+    outdated.swap(m_cached);
+    getStlList().clear();
+}
+
+bool InstanceList::remove(const CimInstance* element) {
+    std::shared_ptr<CimInstance> released;
+    SharedSnapshot outdated;
+    const utils::Mutex::AutoLocker lock(getMutex());
+    const auto found = std::find_if(m_held.begin(), m_held.end(),
+                                    [&](const auto& candidate) { return candidate.get() == element; });
+    if (found == m_held.end()) return false;
+    released = std::move(*found);
+    m_held.erase(found);
+    outdated.swap(m_cached);
+    getStlList().remove(const_cast<CimInstance*>(element));
+    return true;
+}
+
+void InstanceList::publish(InstanceList& rebuilt) {
+    Snapshot taken;
+    std::list<CimInstance*> elements;
+    SharedSnapshot outdated;
+    {
+        const utils::Mutex::AutoLocker lock(rebuilt.getMutex());
+        taken.swap(rebuilt.m_held);
+        elements.swap(rebuilt.getStlList());
+        rebuilt.m_cached.reset();
+    }
+    for (const auto& instance : taken)
+        instance->m_list = m_link;
+    const utils::Mutex::AutoLocker lock(getMutex());
+    m_held.swap(taken);
+    getStlList().swap(elements);
+    outdated.swap(m_cached);
+}
+
+}  // namespace core

@@ -1,0 +1,117 @@
+#pragma once
+
+#include <atomic>
+#include <map>
+#include <memory>
+#include <string>
+#include <string_view>
+#include <vector>
+
+#include "Framework/Model/CimClassInfo.h"
+#include "Framework/Model/CimPropertyList.h"
+#include "Framework/Model/PropertyShape.h"
+#include "Framework/Model/RecursiveMutex.h"
+#include "Utils/Export.h"
+
+namespace core {
+
+class CimProperty;
+class InstanceListLink;
+
+/// Base of every instance class.
+///
+/// Owns no properties: they are members of the derived classes and register themselves here. Several
+/// registered properties may share a name, one per class of the chain that declares it; the one served is the
+/// most derived.
+class QUENX_EXPORT CimInstance : public std::enable_shared_from_this<CimInstance> {
+  public:
+    /// A provider method: input arguments, output arguments, an instance handed back (such as a created job);
+    /// returns the method's CIM return value. The instance handed back stays owned by its class object's
+    /// list.
+    using Method = unsigned int (CimInstance::*)(CimPropertyList&, CimPropertyList&, CimInstance*&);
+
+    CimInstance();
+    CimInstance(const CimInstance&) = delete;
+    CimInstance& operator=(const CimInstance&) = delete;
+
+    /// The class that the instance is served as; the base gives the name of the most derived binding class.
+    virtual std::string getClassName() const;
+    /// Gives the named properties new values: all are checked first, then all set, under one lock.
+    /// CimError for an unknown property, a key, or a wrong type; nothing is changed then.
+    virtual unsigned int modifyInstance(CimPropertyList& requested);
+    /// Looks up the method (without regard to case) and calls it. CimError (method not available) when it is
+    /// not registered; what the method throws passes through.
+    virtual unsigned int invokeMethod(std::string name, CimPropertyList& in, CimPropertyList& out,
+                                      CimInstance*& result);
+    virtual ~CimInstance();
+
+    /// The class name that the instance reports as its creation class: getClassName().
+    std::string getCreationClassName() const;
+
+    /// With true the instance leaves its list at once and is in no later enumeration or look-up. It is
+    /// destroyed when the requests that have enumerated it have ended. The mark cannot be taken back: false
+    /// does nothing.
+    void setDeleted(bool deleted);
+    bool isDeleted() const { return m_deleted.load(std::memory_order_acquire); }
+
+    /// The most derived property of that name (without regard to case); null when there is none.
+    CimProperty* getPropertyByName(std::string_view name) const;
+    /// One property per name, the most derived, in the order of declaration.
+    std::vector<CimProperty*> getProperties() const;
+    /// The keys among them.
+    std::vector<CimProperty*> getKeys() const;
+    /// Every registered property, repeated names included, in the order of construction.
+    const std::vector<CimProperty*>& getAllProperties() const { return m_properties; }
+    /// CimPath::of() this instance, found once and shared until a key changes.
+    std::shared_ptr<const CimPath> getPath() const;
+    /// The most derived class that has said what it is; null when none has.
+    const CimClassInfo* getClassInfo() const { return m_classInfo; }
+
+    /// Guards the values of all properties. A refresh holds it from beginning to end, a front while it copies
+    /// the values, so that nobody sees half a refresh. Never hold the locks of two instances.
+    RecursiveMutex& getMutex() const { return m_mutex; }
+
+  protected:
+    /// Registers a method under its CIM name; called in constructors. The member may be virtual.
+    template <class T>
+    void addMethod(std::string name,
+                   unsigned int (T::*method)(CimPropertyList&, CimPropertyList&, CimInstance*&)) {
+        registerMethod(std::move(name), static_cast<Method>(method));
+    }
+
+    /// Says that the properties built since the last call belong to this class. Called at the end of each
+    /// constructor in the chain; the class information must live as long as the instance.
+    void declareClass(const CimClassInfo& info);
+
+    /// For classes whose destructor waits (for a thread, say): a released instance is then destroyed on a
+    /// thread of the framework's own, so that no request waits for it.
+    void setDestructionWaits() { m_destructionWaits = true; }
+
+  private:
+    friend class CimProperty;
+    friend class InstanceList;
+    friend class Retirement;
+    friend struct InstanceRelease;
+
+    const PropertyShape& shape() const QUENX_REQUIRES(m_mutex);
+    std::vector<CimProperty*> select(const std::vector<std::size_t>& indices) const;
+    void registerMethod(std::string name, Method method);
+    void registerProperty(CimProperty* property);
+    void unregisterProperty(CimProperty* property) noexcept;
+    /// When a key has changed.
+    void forgetPath() const;
+
+    mutable RecursiveMutex m_mutex;
+    std::vector<CimProperty*> m_properties;
+    mutable std::shared_ptr<const PropertyShape> m_shape
+        QUENX_GUARDED_BY(m_mutex);  ///< found at the first use
+    mutable std::shared_ptr<const CimPath> m_path QUENX_GUARDED_BY(m_mutex);
+    std::vector<std::pair<std::string, Method>> m_methods;
+    const CimClassInfo* m_classInfo = nullptr;
+    std::weak_ptr<InstanceListLink> m_list;  ///< set once, when the instance is added
+    CimInstance* m_nextRetired = nullptr;  ///< links the queue of instances to destroy, without an allocation
+    bool m_destructionWaits = false;
+    std::atomic<bool> m_deleted{false};
+};
+
+}  // namespace core

@@ -1,0 +1,54 @@
+#include "Framework/Model/CimType.h"
+
+#include <algorithm>
+#include <array>
+
+namespace core {
+
+namespace {
+
+constexpr std::array<std::string_view, 15> kTypeNames = {
+    "boolean", "string", "char16", "uint8",  "uint16", "uint32",   "uint64",   "sint8",
+    "sint16",  "sint32", "sint64", "real32", "real64", "datetime", "reference"};
+
+constexpr char fold(char c) {
+    return c >= 'A' && c <= 'Z' ? static_cast<char>(c - 'A' + 'a') : c;
+}
+
+}  // namespace
+
+std::string_view typeName(CimType type) {
+    return kTypeNames[static_cast<std::size_t>(type)];
+}
+
+std::optional<CimType> typeByName(std::string_view name) {
+    for (std::size_t i = 0; i < kTypeNames.size(); ++i) {
+        if (sameName(name, kTypeNames[i])) return static_cast<CimType>(i);
+    }
+    return std::nullopt;
+}
+
+bool isUnsigned(CimType type) {
+    return type >= CimType::Uint8 && type <= CimType::Uint64;
+}
+
+bool isSigned(CimType type) {
+    return type >= CimType::Sint8 && type <= CimType::Sint64;
+}
+
+bool isReal(CimType type) {
+    return type == CimType::Real32 || type == CimType::Real64;
+}
+
+bool sameName(std::string_view left, std::string_view right) {
+    return std::equal(left.begin(), left.end(), right.begin(), right.end(),
+                      [](char a, char b) { return fold(a) == fold(b); });
+}
+
+std::string foldName(std::string_view name) {
+    std::string folded(name);
+    std::transform(folded.begin(), folded.end(), folded.begin(), fold);
+    return folded;
+}
+
+}  // namespace core

@@ -1,0 +1,69 @@
+#pragma once
+
+#include <cstdint>
+#include <optional>
+#include <string>
+#include <string_view>
+#include <variant>
+#include <vector>
+
+#include "Framework/Model/CimPath.h"
+#include "Framework/Model/CimType.h"
+#include "Utils/Export.h"
+#include "Utils/Time.h"
+
+namespace core {
+
+/// One value of one CIM type. Unsigned integers of all widths are held as uint64_t, signed ones as int64_t,
+/// reals as double, string and char16 as text.
+using CimScalar = std::variant<bool, std::uint64_t, std::int64_t, double, std::string, utils::Time, CimPath>;
+
+/// One key of an object path.
+struct CimKey {
+    std::string name;
+    CimScalar value;
+};
+
+/// Equal by type: numbers by value (2 equals 2 whether signed or not), texts exactly, references as paths; a
+/// text and a reference are equal when the text parses to that path, a text and a datetime when it is that
+/// datetime's text form, since object paths write all three in quotes.
+QUENX_EXPORT bool sameValue(const CimScalar& left, const CimScalar& right);
+
+/// A typed value, an array of such, or null (DSP0004 5.2.5). An empty array is not null.
+struct QUENX_EXPORT CimValue {
+    CimType type = CimType::String;
+    bool isArray = false;
+    std::variant<std::monostate, CimScalar, std::vector<CimScalar>> data;
+
+    static CimValue null(CimType type, bool isArray = false);
+    static CimValue of(CimType type, CimScalar value);
+    static CimValue arrayOf(CimType type, std::vector<CimScalar> values);
+
+    bool isNull() const { return data.index() == 0; }
+    /// The single value; null pointer when null or an array.
+    const CimScalar* scalar() const { return std::get_if<CimScalar>(&data); }
+    /// The elements; null pointer when null or no array.
+    const std::vector<CimScalar>* elements() const { return std::get_if<std::vector<CimScalar>>(&data); }
+};
+
+/// The value in the type's CIM text form: integers in decimal, booleans TRUE and FALSE, datetimes in 25
+/// characters, references as object paths, strings as they are (not quoted).
+QUENX_EXPORT std::string scalarText(CimType type, const CimScalar& value);
+
+/// Reads a text as a value of the type. Integers in decimal or 0x..., within the range of the type; booleans
+/// in any case; blanks around numbers and booleans are ignored. Nothing where the text is no such value.
+QUENX_EXPORT std::optional<CimScalar> parseScalar(CimType type, std::string_view text);
+
+/// The value as the type wants it held, where that loses nothing (a signed 5 for a uint16, a text for a
+/// reference); nothing where it does.
+QUENX_EXPORT std::optional<CimScalar> convertScalar(CimType type, const CimScalar& value);
+
+/// The CIM datetime text, always 25 characters (DSP0004 5.2.4): `yyyymmddHHMMSS.mmmmmm+000` for a timestamp,
+/// `ddddddddHHMMSS.mmmmmm:000` for an interval (cut at 99999999 days).
+QUENX_EXPORT std::string datetimeText(utils::Time time);
+
+/// Reads the 25-character form; the offset from UTC is applied. Nothing for any other text, asterisks
+/// included.
+QUENX_EXPORT std::optional<utils::Time> parseDatetime(std::string_view text);
+
+}  // namespace core

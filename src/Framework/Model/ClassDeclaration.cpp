@@ -1,0 +1,126 @@
+#include "Framework/Model/ClassDeclaration.h"
+
+#include <algorithm>
+#include <map>
+#include <set>
+
+#include "Framework/Model/CimInstance.h"
+#include "Framework/Model/CimType.h"
+#include "Framework/Model/PropertyShape.h"
+#include "Utils/Os/Linux/Thread.h"
+
+namespace core {
+
+namespace {
+
+std::string referenceClassOf(const CimProperty& property) {
+    const char* target = property.getReferenceClass();
+    return target ? target : "";
+}
+
+/// What the superclasses have declared: names, with the class that each reference leads to, and which of them
+/// are keys.
+struct Inherited {
+    std::map<std::string, std::string> referenceClasses;
+    std::set<std::string> keys;
+
+    void add(const CimProperty& property) {
+        referenceClasses[foldName(property.getName())] = referenceClassOf(property);
+        if (property.isKey()) keys.insert(foldName(property.getName()));
+    }
+    bool isNews(const CimProperty& property) const {
+        const std::string name = foldName(property.getName());
+        const auto inherited = referenceClasses.find(name);
+        return inherited == referenceClasses.end() || (property.isKey() && !keys.contains(name)) ||
+               inherited->second != referenceClassOf(property);  // a reference narrows its class
+    }
+};
+
+PropertyDeclaration declare(CimProperty& property) {
+    return {property.getName(), property.getType(), property.isArray(), property.isKey(),
+            referenceClassOf(property)};
+}
+
+/// The properties that the class adds, read off an instance of it.
+std::vector<PropertyDeclaration> readProperties(const CimClassInfo& info) {
+    if (info.makeSample == nullptr) return {};
+    const DeclarationRecorder recorder;
+    const auto sample = info.makeSample();
+    const auto& all = sample->getAllProperties();
+    Inherited inherited;
+    std::vector<PropertyDeclaration> result;
+    std::size_t begin = 0;
+    for (const auto& [declaring, end] : recorder.marks) {
+        for (std::size_t i = begin; i < end; ++i) {
+            if (declaring == &info && inherited.isNews(*all[i])) result.push_back(declare(*all[i]));
+        }
+        for (std::size_t i = begin; i < end; ++i)
+            inherited.add(*all[i]);
+        begin = end;
+    }
+    return result;
+}
+
+MethodDeclaration declare(const CimMethodInfo& method) {
+    MethodDeclaration result{method.name, method.returnType, {}};
+    for (const CimParameterInfo& parameter : method.parameters) {
+        result.parameters.push_back({parameter.name, parameter.type, parameter.isArray, parameter.direction,
+                                     parameter.optional,
+                                     parameter.referenceClass ? parameter.referenceClass : ""});
+    }
+    return result;
+}
+
+std::shared_ptr<const ClassDeclaration> read(const CimClassInfo& info) {
+    auto declaration = std::make_shared<ClassDeclaration>();
+    declaration->name = info.name;
+    if (info.superclass != nullptr) declaration->superclass = info.superclass->name;
+    declaration->isAssociation = info.isAssociation;
+    declaration->properties = readProperties(info);
+    for (const CimMethodInfo& method : info.methods)
+        declaration->methods.push_back(declare(method));
+    return declaration;
+}
+
+/// Declarations by name, so that nothing points into a library that has unloaded.
+class DeclarationCache {
+  public:
+    std::shared_ptr<const ClassDeclaration> find(const CimClassInfo& info) {
+        const utils::Mutex::AutoLocker lock(m_mutex);
+        auto& declaration = m_declarations[info.name];
+        if (declaration == nullptr) declaration = read(info);
+        return declaration;
+    }
+
+  private:
+    utils::Mutex m_mutex;
+    std::map<std::string, std::shared_ptr<const ClassDeclaration>> m_declarations QUENX_GUARDED_BY(m_mutex);
+};
+
+}  // namespace
+
+ClassChain declarationsOf(const CimClassInfo& info) {
+    static DeclarationCache cache;
+    ClassChain chain;
+    for (const CimClassInfo* level = &info; level != nullptr; level = level->superclass) {
+        chain.push_back(cache.find(*level));
+    }
+    return chain;
+}
+
+bool derivesFrom(const ClassChain& chain, std::string_view className) {
+    return std::any_of(chain.begin(), chain.end(),
+                       [&](const auto& declaration) { return sameName(declaration->name, className); });
+}
+
+const MethodDeclaration* findMethod(const ClassChain& chain, std::string_view name) {
+    for (const auto& declaration : chain) {
+        const auto found =
+            std::find_if(declaration->methods.begin(), declaration->methods.end(),
+                         [&](const MethodDeclaration& method) { return sameName(method.name, name); });
+        if (found != declaration->methods.end()) return &*found;
+    }
+    return nullptr;
+}
+
+}  // namespace core

@@ -1,0 +1,59 @@
+#pragma once
+
+#include <memory>
+#include <string>
+#include <string_view>
+#include <vector>
+
+#include "Framework/Model/CimClassInfo.h"
+#include "Utils/Export.h"
+
+namespace core {
+
+struct PropertyDeclaration {
+    std::string name;
+    CimType type;
+    bool isArray;
+    bool isKey;
+    std::string referenceClass;  ///< empty unless the type is Reference
+};
+
+struct ParameterDeclaration {
+    std::string name;
+    CimType type;
+    bool isArray;
+    CimDirection direction;
+    bool optional;
+    std::string referenceClass;  ///< empty unless the type is Reference
+};
+
+struct MethodDeclaration {
+    std::string name;
+    CimType returnType;
+    std::vector<ParameterDeclaration> parameters;
+};
+
+/// A class as a client reads it: what it adds to its superclass, or newly makes a key of. A value, with no
+/// tie to the library that it was read from.
+struct ClassDeclaration {
+    std::string name;
+    std::string superclass;  ///< empty for a root
+    bool isAssociation = false;
+    std::vector<PropertyDeclaration> properties;
+    std::vector<MethodDeclaration> methods;
+};
+
+/// The declarations of the class and all its superclasses, the class itself first, the root last.
+using ClassChain = std::vector<std::shared_ptr<const ClassDeclaration>>;
+
+/// Reads the chain off the class information. Each class is read once per process and remembered by name.
+/// Thread-safe.
+QUENX_EXPORT ClassChain declarationsOf(const CimClassInfo& info);
+
+/// Whether a class of that name is in the chain.
+QUENX_EXPORT bool derivesFrom(const ClassChain& chain, std::string_view className);
+
+/// The method, looked up from the class towards the root; null when no class of the chain declares it.
+QUENX_EXPORT const MethodDeclaration* findMethod(const ClassChain& chain, std::string_view name);
+
+}  // namespace core

@@ -1,0 +1,165 @@
+// Walking associations.
+#include <functional>
+#include <map>
+#include <set>
+#include <unordered_map>
+
+#include "Framework/Classes/InstanceRange.h"
+#include "Framework/Classes/RequestScope.h"
+#include "Framework/Model/CimPropertyRef.h"
+#include "Framework/Requests/CimRequests.h"
+#include "Framework/Requests/RequestTools.h"
+#include "Framework/Requests/ServedModel.h"
+
+namespace core {
+
+namespace {
+
+/// A reference property of an association instance.
+struct End {
+    std::string role;
+    CimPath path;
+};
+
+std::vector<End> endsOf(const CimInstance& association) {
+    std::vector<End> ends;
+    const RecursiveLocker lock(association.getMutex());
+    for (const CimProperty* property : association.getProperties()) {
+        const auto* reference = dynamic_cast<const CimPropertyRef*>(property);
+        if (reference != nullptr && !reference->IsNull())
+            ends.push_back({property->getName(), reference->getPath()});
+    }
+    return ends;
+}
+
+bool isRole(const std::string& wanted, const End& end) {
+    return wanted.empty() || sameName(wanted, end.role);
+}
+
+/// Visits every association instance that refers to the path in the wanted role, with the index of that end.
+void visitReferences(const ServedModel& model, const CimPath& path, const std::string& associationClass,
+                     const std::string& role,
+                     const std::function<void(CimInstance&, const std::vector<End>&, std::size_t)>& visit) {
+    for (const ModelClass& each : model.associations(associationClass)) {
+        auto instances = each.agent->getInstances(each.served->name);
+        for (CimInstance* instance = instances.first(); instance != nullptr; instance = instances.next()) {
+            const std::vector<End> ends = endsOf(*instance);
+            for (std::size_t i = 0; i < ends.size(); ++i) {
+                if (isRole(role, ends[i]) && ends[i].path.names(path)) visit(*instance, ends, i);
+            }
+        }
+    }
+}
+
+/// The paths at the other ends, each once.
+std::vector<CimPath> farEnds(CimBroker& broker, const CimPath& path, const AssociationFilter& by) {
+    const ServedModel model(broker);
+    std::set<std::string> seen;
+    std::vector<CimPath> result;
+    visitReferences(model, path, by.associationClass, by.role,
+                    [&](CimInstance&, const std::vector<End>& ends, std::size_t near) {
+                        for (std::size_t i = 0; i < ends.size(); ++i) {
+                            if (i == near || !isRole(by.resultRole, ends[i])) continue;
+                            const CimPath& far = ends[i].path;
+                            if (!by.resultClass.empty() &&
+                                !derivesFrom(model.chainOf(far.getClassName()), by.resultClass)) {
+                                continue;
+                            }
+                            if (seen.insert(far.toString()).second) result.push_back(far);
+                        }
+                    });
+    return result;
+}
+
+/// Finds many instances by their paths, and enumerates each class once for all of them. The request scope
+/// holds what it finds.
+class InstanceFinder {
+  public:
+    explicit InstanceFinder(CimBroker& broker) : m_broker(broker) {}
+
+    CimInstance* find(CimPath& path) {
+        const auto [entry, isNew] = m_classes.try_emplace(foldName(path.getClassName()));
+        if (isNew) enumerate(path.getClassName(), entry->second);
+        const auto found = entry->second.find(path.toString());
+        // A path may be spelled otherwise than its instance spells it.
+        return found == entry->second.end() ? m_broker.getInstanceByPath(path) : found->second;
+    }
+
+  private:
+    using Instances = std::unordered_map<std::string, CimInstance*>;
+
+    void enumerate(const std::string& className, Instances& instances) {
+        for (CimInstance* instance : InstanceRange(m_broker.getInstances(className, ""))) {
+            instances.emplace(CimPath::of(*instance).toString(), instance);
+        }
+    }
+
+    CimBroker& m_broker;
+    std::map<std::string, Instances> m_classes;
+};
+
+/// The association instances that refer to the path, each once.
+void visitAssociations(CimBroker& broker, const CimPath& path, const AssociationFilter& by,
+                       const std::function<void(CimInstance&, CimPath)>& visit) {
+    const ServedModel model(broker);
+    const std::string& wanted = by.associationClass.empty() ? by.resultClass : by.associationClass;
+    std::set<std::string> seen;
+    visitReferences(model, path, wanted, by.role,
+                    [&](CimInstance& association, const std::vector<End>&, std::size_t) {
+                        CimPath own = CimPath::of(association);
+                        if (seen.insert(own.toString()).second) visit(association, std::move(own));
+                    });
+}
+
+}  // namespace
+
+std::vector<InstanceValue> CimRequests::associators(const CimPath& path, const AssociationFilter& by,
+                                                    const PropertyFilter& filter) const {
+    const RequestScope scope;
+    return answering([&] {
+        std::vector<InstanceValue> result;
+        InstanceFinder finder(*m_broker);
+        for (CimPath& far : farEnds(*m_broker, path, by)) {
+            if (CimInstance* instance = finder.find(far)) {
+                result.push_back(readInstance(*instance, std::move(far), filter, m_namespace));
+            }
+        }
+        return result;
+    });
+}
+
+std::vector<CimPath> CimRequests::associatorNames(const CimPath& path, const AssociationFilter& by) const {
+    const RequestScope scope;
+    return answering([&] {
+        std::vector<CimPath> result = farEnds(*m_broker, path, by);
+        for (CimPath& far : result)
+            far.completeNamespace(m_namespace);
+        return result;
+    });
+}
+
+std::vector<InstanceValue> CimRequests::references(const CimPath& path, const AssociationFilter& by,
+                                                   const PropertyFilter& filter) const {
+    const RequestScope scope;
+    return answering([&] {
+        std::vector<InstanceValue> result;
+        visitAssociations(*m_broker, path, by, [&](CimInstance& association, CimPath own) {
+            result.push_back(readInstance(association, std::move(own), filter, m_namespace));
+        });
+        return result;
+    });
+}
+
+std::vector<CimPath> CimRequests::referenceNames(const CimPath& path, const AssociationFilter& by) const {
+    const RequestScope scope;
+    return answering([&] {
+        std::vector<CimPath> result;
+        visitAssociations(*m_broker, path, by, [&](CimInstance&, CimPath own) {
+            own.completeNamespace(m_namespace);
+            result.push_back(std::move(own));
+        });
+        return result;
+    });
+}
+
+}  // namespace core

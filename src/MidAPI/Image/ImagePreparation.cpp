@@ -1,0 +1,155 @@
+#include "MidAPI/Image/ImagePreparation.h"
+
+#include <algorithm>
+#include <optional>
+
+#include "MidAPI/Image/OptionRomWriter.h"
+
+namespace ma {
+namespace {
+
+using Types = std::vector<utils::FirmwareType>;
+using Components = std::vector<utils::FirmwareVersionInfo>;
+
+Preparation refuse(PrepareStatus status, std::string reason) {
+    Preparation refusal;
+    refusal.status = status;
+    refusal.reason = std::move(reason);
+    return refusal;
+}
+
+std::string typeNames(const Components& components) {
+    std::string names;
+    for (const utils::FirmwareVersionInfo& component : components)
+        names += (names.empty() ? "" : ", ") + std::string(firmwareTypeName(component.type));
+    return names.empty() ? "no boot image" : names;
+}
+
+/// Why an image is not for this card at all; empty when it is.
+std::string mismatch(const PreparationTarget& target, const RomImage& image, std::size_t number) {
+    const std::string which = "image " + std::to_string(number) + " of the file ";
+    if (!image.isNetwork())
+        return which + "is not for a network adapter (its base class code is " +
+               std::to_string(image.classCode >> 16) + ", not 2)";
+    if (image.fits(target.vendorId, target.deviceId)) return {};
+    return which + "is for PCI device " + formatIds(image.vendorId, image.deviceId) + ", the adapter is " +
+           formatIds(target.vendorId, target.deviceId);
+}
+
+/// Every image must be for the card, also those that are not asked for: a file with images of two cards is no
+/// file to trust.
+std::string anyMismatch(const PreparationTarget& target, const RomFile& rom) {
+    for (std::size_t index = 0; index < rom.images.size(); ++index) {
+        std::string found = mismatch(target, rom.images[index], index + 1);
+        if (!found.empty()) return found;
+    }
+    return {};
+}
+
+/// The requested types, ascending, each once, without type 0.
+Types normalised(Types types) {
+    std::erase(types, utils::FirmwareType{});
+    std::sort(types.begin(), types.end());
+    types.erase(std::unique(types.begin(), types.end()), types.end());
+    return types;
+}
+
+bool isWanted(const RomImage& image, const Types& requested) {
+    if (requested.empty()) return image.type != utils::FirmwareType{};
+    return std::any_of(requested.begin(), requested.end(),
+                       [&image](utils::FirmwareType type) { return image.carries(type); });
+}
+
+std::optional<uint32_t> versionOf(const Components& components, utils::FirmwareType type) {
+    for (const utils::FirmwareVersionInfo& component : components)
+        if (component.type == type) return component.version;
+    return std::nullopt;
+}
+
+/// A requested type that the file does not have; a file of which nothing can be installed.
+std::string notApplicable(const RomFile& rom, const Types& requested, const RomFile& chosen) {
+    const Components inFile = rom.components();
+    for (const utils::FirmwareType type : requested) {
+        if (versionOf(inFile, type)) continue;
+        const std::string_view name = firmwareTypeName(type);
+        return "the file has no image of type " +
+               (name.empty() ? std::to_string(static_cast<int32_t>(type)) : std::string(name)) + ", it has " +
+               typeNames(inFile);
+    }
+    return chosen.images.empty() ? "the file has no image that an adapter could be given" : "";
+}
+
+/// What the flash would carry differs from what it carries: a type is new, or a CLP entry point would be
+/// lost.
+bool typesDiffer(const PreparationTarget& target, const RomFile& chosen) {
+    const Components incoming = chosen.components();
+    for (const utils::FirmwareVersionInfo& component : incoming)
+        if (!versionOf(target.components, component.type)) return true;
+    return versionOf(target.components, utils::FirmwareType::CLP) &&
+           versionOf(incoming, utils::FirmwareType::PXE) && !versionOf(incoming, utils::FirmwareType::CLP);
+}
+
+/// Names the component that would go back; both versions, installed one first.
+std::string downgrade(const PreparationTarget& target, const RomFile& chosen) {
+    for (const utils::FirmwareVersionInfo& component : chosen.components()) {
+        const uint32_t installed = versionOf(target.components, component.type).value_or(0);
+        if (component.version < installed)
+            return std::string(firmwareTypeName(component.type)) + " would go back from version " +
+                   std::to_string(installed) + " (installed) to " + std::to_string(component.version) +
+                   " (in the file)";
+    }
+    return {};
+}
+
+RomFile chooseImages(const RomFile& rom, const Types& requested) {
+    RomFile chosen;
+    std::copy_if(rom.images.begin(), rom.images.end(), std::back_inserter(chosen.images),
+                 [&requested](const RomImage& image) { return isWanted(image, requested); });
+    return chosen;
+}
+
+}  // namespace
+
+Preparation assessImage(const PreparationTarget& target, std::span<const uint8_t> file,
+                        const std::vector<utils::FirmwareType>& requested) {
+    const RomFile rom = parseOptionRom(file);
+    // A file for another card is called that even when it is damaged too: mending it would not help.
+    if (std::string reason = anyMismatch(target, rom); !reason.empty())
+        return refuse(IMAGE_NOT_SUPPORTED, std::move(reason));
+    if (rom.error) return refuse(INVALID_PARAMETER, "the file is no intact ROM image: " + *rom.error);
+    if (!target.canBeUpdated) return refuse(IMAGE_NOT_SUPPORTED, "this adapter cannot be updated");
+
+    const Types wanted = normalised(requested);
+    RomFile chosen = chooseImages(rom, wanted);
+    if (std::string reason = notApplicable(rom, wanted, chosen); !reason.empty())
+        return refuse(IMAGE_NOT_APPLICABLE, std::move(reason));
+
+    Preparation result;
+    const Components incoming = chosen.components();
+    for (const utils::FirmwareVersionInfo& component : incoming)
+        result.types.push_back(component.type);
+    if (typesDiffer(target, chosen)) {
+        result.status = IMAGE_TYPES_DIFFER;
+        result.reason =
+            "the image has " + typeNames(incoming) + ", the adapter carries " + typeNames(target.components);
+    } else if (result.reason = downgrade(target, chosen); !result.reason.empty()) {
+        result.status = IMAGE_IS_OLDER;
+    }
+    result.chosen = std::move(chosen.images);
+    return result;
+}
+
+bool hasOutput(PrepareStatus status) {
+    return status == PREPARED || status == IMAGE_IS_OLDER || status == IMAGE_TYPES_DIFFER;
+}
+
+std::size_t composeChosen(const Preparation& preparation, std::span<const uint8_t> file,
+                          std::span<uint8_t> output) {
+    std::vector<std::span<const uint8_t>> images;
+    images.reserve(preparation.chosen.size());
+    for (const RomImage& image : preparation.chosen)
+        images.push_back(imageBytes(file, image));
+    return composeOptionRom(images, output);
+}
+
+}  // namespace ma

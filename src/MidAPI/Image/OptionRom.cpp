@@ -1,0 +1,229 @@
+#include "MidAPI/Image/OptionRom.h"
+
+#include <algorithm>
+#include <array>
+#include <cinttypes>
+#include <cstdio>
+
+#include "MidAPI/Image/ByteView.h"
+#include "MidAPI/Image/RomChecksum.h"
+
+namespace ma {
+namespace {
+
+using Bytes = std::span<const uint8_t>;
+
+constexpr std::array<std::string_view, 6> TYPE_NAMES = {"",        "IMG_CLP",  "IMG_iSCSI",
+                                                        "IMG_PXE", "IMG_UEFI", "IMG_FCoE"};
+
+/// What is wrong with the image at hand; the offset is from the start of the image.
+struct Flaw {
+    std::size_t offset;
+    std::string what;
+};
+using MaybeFlaw = std::optional<Flaw>;
+
+std::string describe(std::size_t imageNumber, std::size_t imageOffset, const Flaw& flaw) {
+    char where[96];
+    std::snprintf(where, sizeof where, "image %zu at 0x%zx: ", imageNumber + 1, imageOffset);
+    char at[48];
+    std::snprintf(at, sizeof at, " (offset 0x%zx)", imageOffset + flaw.offset);
+    return where + flaw.what + at;
+}
+
+/// The NUL-terminated text at an offset of the image; empty when there is none.
+std::string textAt(Bytes image, std::size_t offset) {
+    constexpr std::size_t LONGEST = 255;
+    std::string text;
+    if (offset == 0) return text;
+    for (; offset < image.size() && image[offset] != 0 && text.size() < LONGEST; ++offset) {
+        const char character = static_cast<char>(image[offset]);
+        text += character >= ' ' && character <= '~' ? character : '?';
+    }
+    return text;
+}
+
+bool contains(std::string_view text, std::string_view word) {
+    const auto sameLetter = [](char a, char b) { return (a | 0x20) == (b | 0x20); };
+    return std::search(text.begin(), text.end(), word.begin(), word.end(), sameLetter) != text.end();
+}
+
+utils::FirmwareType typeOfProduct(std::string_view product) {
+    if (contains(product, "iSCSI")) return utils::FirmwareType::iSCSI;
+    if (contains(product, "FCoE")) return utils::FirmwareType::FCoE;
+    return utils::FirmwareType::PXE;
+}
+
+/// Follows the chain of Plug and Play headers to the first product name that tells a boot protocol; without
+/// one the first header's texts stay. An image without such a header is in order: older ones have none.
+void readPnp(Bytes image, RomImage& out) {
+    out.type = utils::FirmwareType::PXE;
+    std::size_t offset = readLe16(image, rom::HEADER_PNP);
+    for (int header = 0; header < rom::MAX_PNP_HEADERS && offset != 0; ++header) {
+        if (!fitsIn(offset, rom::PNP_LENGTH, image.size())) return;
+        if (!std::equal(image.begin() + static_cast<std::ptrdiff_t>(offset),
+                        image.begin() + static_cast<std::ptrdiff_t>(offset + 4), "$PnP"))
+            return;
+        std::string product = textAt(image, readLe16(image, offset + rom::PNP_PRODUCT));
+        const utils::FirmwareType type = typeOfProduct(product);
+        if (header == 0 || type != utils::FirmwareType::PXE) {
+            out.manufacturer = textAt(image, readLe16(image, offset + rom::PNP_MANUFACTURER));
+            out.product = std::move(product);
+            out.type = type;
+        }
+        if (type != utils::FirmwareType::PXE) return;
+        offset = readLe16(image, offset + rom::PNP_NEXT);
+    }
+}
+
+/// The list of further device ids; `data` is the image from the start of its PCI data structure on.
+MaybeFlaw readDeviceList(Bytes data, RomImage& out) {
+    std::size_t offset = readLe16(data, rom::PCIR_DEVICE_LIST);
+    if (offset == 0) return std::nullopt;
+    // Else a change of the last-image bit or the revision would change the list.
+    if (offset < readLe16(data, rom::PCIR_LENGTH))
+        return Flaw{out.dataStructure + rom::PCIR_DEVICE_LIST,
+                    "the list of device ids lies inside the PCI data structure"};
+    for (; fitsIn(offset, 2, data.size()); offset += 2) {
+        const uint16_t id = readLe16(data, offset);
+        if (id == 0) return std::nullopt;
+        out.furtherDeviceIds.push_back(id);
+    }
+    return Flaw{out.dataStructure + rom::PCIR_DEVICE_LIST, "the list of device ids has no end"};
+}
+
+/// Finds the PCI data structure and the length of the image that starts `rest`.
+MaybeFlaw locate(Bytes rest, RomImage& out) {
+    if (rest.size() < rom::HEADER_LENGTH) return Flaw{0, "the file ends inside the image header"};
+    if (readLe16(rest, 0) != rom::SIGNATURE) return Flaw{0, "the signature 55 AA is missing"};
+    const std::size_t offset = readLe16(rest, rom::HEADER_DATA_STRUCTURE);
+    if (offset < rom::HEADER_LENGTH || !fitsIn(offset, rom::PCIR_LENGTH_REVISION_0, rest.size()))
+        return Flaw{rom::HEADER_DATA_STRUCTURE, "the PCI data structure lies outside the image"};
+    const Bytes data = rest.subspan(offset);
+    if (!std::equal(data.begin(), data.begin() + 4, "PCIR"))
+        return Flaw{offset, "the PCI data structure does not begin with \"PCIR\""};
+    const std::size_t length = readLe16(data, rom::PCIR_IMAGE_UNITS) * rom::UNIT;
+    if (length == 0) return Flaw{offset + rom::PCIR_IMAGE_UNITS, "the image length is 0"};
+    if (length > rest.size()) {
+        return Flaw{offset + rom::PCIR_IMAGE_UNITS,
+                    "the image is " + std::to_string(length) + " bytes long, but the file has only " +
+                        std::to_string(rest.size()) + " left: it is cut short"};
+    }
+    const std::size_t structureLength = readLe16(data, rom::PCIR_LENGTH);
+    if (structureLength < rom::PCIR_LENGTH_REVISION_0 || !fitsIn(offset, structureLength, length))
+        return Flaw{offset + rom::PCIR_LENGTH, "the length of the PCI data structure is wrong"};
+    out.dataStructure = static_cast<uint32_t>(offset);
+    out.length = static_cast<uint32_t>(length);
+    return std::nullopt;
+}
+
+/// The fields of the PCI data structure; `data` as for readDeviceList().
+MaybeFlaw readDataStructure(Bytes data, RomImage& out) {
+    out.vendorId = readLe16(data, rom::PCIR_VENDOR);
+    out.deviceId = readLe16(data, rom::PCIR_DEVICE);
+    out.classCode = readLe16(data, rom::PCIR_CLASS) | uint32_t{data[rom::PCIR_CLASS + 2]} << 16;
+    out.codeRevision = readLe16(data, rom::PCIR_CODE_REVISION);
+    out.codeType = data[rom::PCIR_CODE_TYPE];
+    out.last = (data[rom::PCIR_INDICATOR] & rom::LAST_IMAGE) != 0;
+    if (data[rom::PCIR_REVISION] < 3 || readLe16(data, rom::PCIR_LENGTH) < rom::PCIR_LENGTH_REVISION_3)
+        return std::nullopt;
+    out.clpEntry = readLe16(data, rom::PCIR_CLP);
+    return readDeviceList(data, out);
+}
+
+MaybeFlaw readCode(Bytes image, RomImage& out) {
+    if (out.codeType == rom::CODE_PC_AT) {
+        const uint8_t sum = sumOfImage(image);
+        if (sum != 0)
+            return Flaw{0, "the checksum is wrong: the bytes sum to " + std::to_string(sum) + ", not 0"};
+        readPnp(image, out);
+    } else if (out.codeType == rom::CODE_EFI) {
+        if (readLe32(image, rom::HEADER_EFI_SIGNATURE) != rom::EFI_SIGNATURE)
+            return Flaw{rom::HEADER_EFI_SIGNATURE, "an EFI image without the EFI signature"};
+        out.type = utils::FirmwareType::UEFI;
+    }
+    return std::nullopt;
+}
+
+MaybeFlaw readImage(Bytes rest, RomImage& out) {
+    if (MaybeFlaw flaw = locate(rest, out)) return flaw;
+    const Bytes image = rest.first(out.length);
+    if (MaybeFlaw flaw = readDataStructure(image.subspan(out.dataStructure), out)) return flaw;
+    return readCode(image, out);
+}
+
+}  // namespace
+
+bool RomImage::fits(uint16_t vendor, uint16_t device) const {
+    return vendorId == vendor &&
+           (deviceId == device ||
+            std::find(furtherDeviceIds.begin(), furtherDeviceIds.end(), device) != furtherDeviceIds.end());
+}
+
+bool RomImage::carries(utils::FirmwareType wanted) const {
+    return wanted != utils::FirmwareType{} &&
+           (type == wanted || (wanted == utils::FirmwareType::CLP && isClp()));
+}
+
+std::vector<utils::FirmwareVersionInfo> RomFile::components() const {
+    std::vector<utils::FirmwareVersionInfo> found;
+    for (std::size_t index = 1; index < TYPE_NAMES.size(); ++index) {
+        const auto type = static_cast<utils::FirmwareType>(index);
+        std::optional<uint16_t> highest;
+        for (const RomImage& image : images)
+            if (image.carries(type)) highest = std::max(highest.value_or(0), image.codeRevision);
+        if (highest) found.push_back({type, *highest});
+    }
+    return found;
+}
+
+RomFile parseOptionRom(std::span<const uint8_t> file) {
+    RomFile result;
+    std::size_t offset = 0;
+    for (bool last = false; !last;) {
+        const std::size_t number = result.images.size();
+        RomImage image;
+        image.offset = static_cast<uint32_t>(offset);
+        MaybeFlaw flaw;
+        if (file.empty())
+            flaw = Flaw{0, "the file is empty"};
+        else if (number == rom::MAX_IMAGES)
+            flaw = Flaw{0, "more than " + std::to_string(rom::MAX_IMAGES) + " images"};
+        else if (offset == file.size())
+            flaw = Flaw{0, "the file ends before the image that has the last-image bit: it is cut short"};
+        else
+            flaw = readImage(file.subspan(offset), image);
+        if (flaw) {
+            result.error = describe(number, offset, *flaw);
+            return result;
+        }
+        offset += image.length;
+        last = image.last;
+        result.images.push_back(std::move(image));
+    }
+    return result;
+}
+
+std::span<const uint8_t> imageBytes(std::span<const uint8_t> file, const RomImage& image) {
+    return fitsIn(image.offset, image.length, file.size()) ? file.subspan(image.offset, image.length)
+                                                           : std::span<const uint8_t>{};
+}
+
+std::string formatIds(uint16_t vendor, uint16_t device) {
+    char text[10];
+    std::snprintf(text, sizeof text, "%04" PRIx16 ":%04" PRIx16, vendor, device);
+    return text;
+}
+
+std::string_view firmwareTypeName(utils::FirmwareType type) {
+    const auto index = static_cast<std::size_t>(type);  // a negative value becomes a large one
+    return index < TYPE_NAMES.size() ? TYPE_NAMES[index] : std::string_view{};
+}
+
+std::optional<utils::FirmwareType> firmwareTypeFromName(std::string_view name) {
+    const auto found = std::find(TYPE_NAMES.begin() + 1, TYPE_NAMES.end(), name);
+    if (found == TYPE_NAMES.end()) return std::nullopt;
+    return static_cast<utils::FirmwareType>(found - TYPE_NAMES.begin());
+}
+
+}  // namespace ma

@@ -1,0 +1,77 @@
+#pragma once
+
+#include <cstddef>
+#include <cstdint>
+#include <optional>
+#include <span>
+#include <string>
+#include <vector>
+
+#include "MidAPI/Image/RomLayout.h"
+#include "Utils/Export.h"
+#include "Utils/FirmwareTypes.h"
+
+/// Reading PCI expansion ROM files (PCI Firmware Specification 3.x): a chain of images, each a multiple of
+/// 512 bytes long, one behind the other until one has the last-image bit. Everything here is free of state;
+/// the functions may be called from any thread.
+namespace ma {
+
+/// One image of a chain, as its header and its PCI data structure describe it.
+struct QUENX_EXPORT RomImage {
+    uint32_t offset = 0;         ///< from the start of the file, bytes
+    uint32_t length = 0;         ///< bytes, a multiple of 512
+    uint32_t dataStructure = 0;  ///< offset of the PCI data structure from the start of the image, bytes
+    uint16_t vendorId = 0;
+    uint16_t deviceId = 0;
+    std::vector<uint16_t>
+        furtherDeviceIds;  ///< of the same vendor; only data structures of revision 3 have them
+    uint8_t codeType = 0;  ///< one of RomCodeType, or a value not known here
+    uint16_t codeRevision = 0;
+    uint32_t classCode = 0;  ///< 24 bits: base class, subclass, programming interface
+    bool last = false;
+    uint16_t clpEntry = 0;  ///< offset of the DMTF CLP entry point, 0 for none
+    std::string
+        manufacturer;     ///< from the Plug and Play expansion headers; printable, at most 255 characters
+    std::string product;  ///< likewise; where a chain of headers names several, the one that tells the type
+
+    /// What the image boots: IMG_UEFI for code type 3; for code type 0 IMG_iSCSI or IMG_FCoE when a product
+    /// name says so, otherwise IMG_PXE; type 0 for code that no port of this system runs.
+    utils::FirmwareType type{};
+
+    /// An image with a CLP entry point counts as IMG_CLP too, with the same revision and the same fate:
+    /// choosing either type chooses the image.
+    bool isClp() const { return clpEntry != 0; }
+    bool isNetwork() const { return (classCode >> 16) == rom::NETWORK_BASE_CLASS; }
+    /// True when the image was made for this device.
+    bool fits(uint16_t vendor, uint16_t device) const;
+    /// True when the image is of this type, IMG_CLP included.
+    bool carries(utils::FirmwareType wanted) const;
+};
+
+/// What reading a file gave. With an error, `images` are those before the place where it is.
+struct QUENX_EXPORT RomFile {
+    std::vector<RomImage> images;
+    std::optional<std::string> error;  ///< a sentence naming what is wrong, and at which offset of the file
+
+    /// The components in the file, ascending by type, one per type; with several images of one type (UEFI
+    /// drivers for several machines) the highest code revision counts.
+    std::vector<utils::FirmwareVersionInfo> components() const;
+};
+
+/// Reads a chain. Never reads outside `file`, whatever the bytes. What follows the last image is ignored.
+/// Checksums of code type 0 images are verified; more than rom::MAX_IMAGES images are an error.
+QUENX_EXPORT RomFile parseOptionRom(std::span<const uint8_t> file);
+
+/// The bytes of one image of a parsed file.
+QUENX_EXPORT std::span<const uint8_t> imageBytes(std::span<const uint8_t> file, const RomImage& image);
+
+/// "1af4:1041": ids as they are usually written.
+QUENX_EXPORT std::string formatIds(uint16_t vendor, uint16_t device);
+
+/// Name of a type as clients write it ("IMG_PXE"); empty for type 0 and for what is no type.
+QUENX_EXPORT std::string_view firmwareTypeName(utils::FirmwareType type);
+
+/// The type of this name, case and all; nothing for an unknown name (also for the empty one).
+QUENX_EXPORT std::optional<utils::FirmwareType> firmwareTypeFromName(std::string_view name);
+
+}  // namespace ma

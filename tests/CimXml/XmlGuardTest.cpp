@@ -1,0 +1,114 @@
+#include "CimXml/XmlGuard.h"
+
+#include <gtest/gtest.h>
+
+#include <random>
+#include <string>
+
+#include "CimXml/WireError.h"
+#include "CimXml/XmlText.h"
+
+namespace {
+
+using namespace std::string_literals;
+
+bool isAccepted(const std::string& document, const cimxml::XmlLimits& limits = {}) {
+    try {
+        cimxml::checkWellFormed(document, limits);
+        return true;
+    } catch (const cimxml::WireError& error) {
+        EXPECT_EQ(error.fault(), cimxml::WireFault::NotWellFormed);
+        return false;
+    }
+}
+
+TEST(XmlGuardTest, AcceptsWellFormedDocuments) {
+    EXPECT_TRUE(isAccepted("\xEF\xBB\xBF<?xml version='1.0' encoding=\"UTF-8\" standalone='yes'?>\n<a/>"));
+    EXPECT_TRUE(isAccepted("<a b='1' c=\"&lt;'\"><d >x &amp; &#x41; &#x10FFFF; ]] ></d ><![CDATA[<&]]></a>"));
+    EXPECT_TRUE(isAccepted("<a>gr\xC3\xBC\xE2\x82\xAC\xF0\x9F\x98\x80\t\r\n</a>\n<!-- end --><?p x?>"));
+}
+
+TEST(XmlGuardTest, RefusesWhatIsNotWellFormed) {
+    for (const std::string& bad : {
+             ""s,
+             "<a>"s,
+             "<a></b>"s,
+             "<a/><b/>"s,
+             "text<a/>"s,
+             "<a b=1/>"s,
+             "<a b='1' b='2'/>"s,
+             "<a b='<'/>"s,
+             "<a b='1/>"s,
+             "<1a/>"s,
+             "<a>&</a>"s,
+             "<a>&unknown;</a>"s,
+             "<a>&amp</a>"s,
+             "<a>&#0;</a>"s,
+             "<a>&#xD800;</a>"s,
+             "<a>&#x110000;</a>"s,
+             "<a b='&no;'/>"s,
+             "<a>]]></a>"s,
+             "<a><!-- -- --></a>"s,
+             "<a><!-- </a>"s,
+             "<![CDATA[x]]><a/>"s,
+             " <?xml version='1.0'?><a/>"s,
+             "<?xml version='1.0' encoding='utf-16'?><a/>"s,
+             "<!DOCTYPE a><a/>"s,
+             "<!DOCTYPE a [<!ENTITY x 'y'>]><a>&x;</a>"s,
+             "<a><!ELEMENT b></a>"s,
+             // NUL, control, bare continuation, overlong, surrogate, beyond the last plane, cut short, FFFE.
+             "<a>\0</a>"s,
+             "<a>\x01</a>"s,
+             "<a>\x80</a>"s,
+             "<a>\xC0\x80</a>"s,
+             "<a>\xE0\x80\xAF</a>"s,
+             "<a>\xED\xA0\x80</a>"s,
+             "<a>\xF4\x90\x80\x80</a>"s,
+             "<a>\xE2\x82</a>"s,
+             "<a>\xEF\xBF\xBE</a>"s,
+         }) {
+        EXPECT_FALSE(isAccepted(bad)) << bad;
+    }
+}
+
+TEST(XmlGuardTest, KeepsTheLimits) {
+    const auto nested = [](std::size_t depth) {
+        std::string text;
+        for (std::size_t i = 0; i < depth; ++i)
+            text += "<a>";
+        for (std::size_t i = 0; i < depth; ++i)
+            text += "</a>";
+        return text;
+    };
+    EXPECT_TRUE(isAccepted(nested(64)));
+    EXPECT_FALSE(isAccepted(nested(65)));
+    EXPECT_FALSE(isAccepted(nested(1000000)));
+    EXPECT_TRUE(isAccepted("<a><b/><b/></a>", {.elements = 3}));
+    EXPECT_FALSE(isAccepted("<a><b/><b/><b/></a>", {.elements = 3}));
+    EXPECT_TRUE(isAccepted("<a b='' c=''/>", {.attributes = 2}));
+    EXPECT_FALSE(isAccepted("<a b='' c='' d=''/>", {.attributes = 2}));
+}
+
+std::string escaped(const std::string& text) {
+    std::string out;
+    cimxml::appendEscaped(out, text);
+    return out;
+}
+
+TEST(XmlTextTest, AnyBytesBecomeTextThatIsAccepted) {
+    EXPECT_EQ(escaped("a<b>&\"c' \t\r\n"), "a&lt;b&gt;&amp;&quot;c' \t\r\n");
+    EXPECT_EQ(escaped("\0\x01x\x1Fy\x7F"s), "xy\x7F");
+    EXPECT_EQ(escaped("\xC3\xBC\xF0\x9F\x98\x80"), "\xC3\xBC\xF0\x9F\x98\x80");
+    EXPECT_EQ(escaped("a\xC3"), "a\xEF\xBF\xBD");
+    EXPECT_EQ(escaped("\xED\xA0\x80"), "\xEF\xBF\xBD\xEF\xBF\xBD\xEF\xBF\xBD");
+    std::mt19937 random(1);
+    for (int round = 0; round < 2000; ++round) {
+        std::string bytes(random() % 40, ' ');
+        for (char& byte : bytes)
+            byte = static_cast<char>(random() % 3 == 0 ? 0x80 + random() % 128 : random());
+        const std::string text = escaped(bytes);
+        ASSERT_TRUE(isAccepted("<a b=\"" + text + "\">" + text + "</a>")) << text;
+    }
+}
+
+}  // namespace
