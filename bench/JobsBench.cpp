@@ -58,7 +58,7 @@ void refreshAndEnumerate(benchmark::State& state) {
 /// What a front gets: the same, with every property as a value.
 void enumerateAsValues(benchmark::State& state) {
     const Jobs jobs(static_cast<std::size_t>(state.range(0)));
-    const core::CimRequests requests("root/cimv2");
+    core::CimRequests requests("root/cimv2");
     for (auto _ : state) {
         bench::emptyCaches(state);
         benchmark::DoNotOptimize(requests.enumerateInstances("Quenx_ConcreteJob"));

@@ -27,7 +27,7 @@ class Host {
     CimValue firstReference(const char* className) const {
         return CimValue::of(CimType::Reference, CimScalar(first(className)));
     }
-    const core::CimRequests& requests() const { return m_requests; }
+    core::CimRequests& requests() { return m_requests; }
     const std::string& imageUri() const { return m_adapters.imageUri(); }
 
   private:

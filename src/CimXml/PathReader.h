@@ -3,7 +3,7 @@
 #include <pugixml.hpp>
 #include <string>
 
-#include "Framework/Model/CimPath.h"
+#include "Framework/Model/CimValue.h"
 
 namespace cimxml {
 

@@ -8,7 +8,8 @@
 #include <vector>
 
 #include "Framework/Model/CimError.h"
-#include "Framework/Requests/CimRequests.h"
+#include "Framework/Model/ClassDeclaration.h"
+#include "Framework/Requests/RequestValues.h"
 
 namespace cimxml {
 

@@ -109,7 +109,10 @@ void LocalManagement::deleteInstance(const core::CimPath& path) {
 }
 
 std::vector<core::ClassDeclaration> LocalManagement::classes() {
-    return requests_->enumerateClasses("", true);
+    std::vector<core::ClassDeclaration> declarations;
+    for (const core::ClassChain& chain : requests_->enumerateClasses("", true))
+        declarations.push_back(*chain.front());
+    return declarations;
 }
 
 }  // namespace cli

@@ -27,6 +27,11 @@ const char* Exception::what() const noexcept {
     return m_message.c_str();
 }
 
+EUnspecifiedError::EUnspecifiedError(const std::string& message)
+    : Exception("EUnspecifiedError:" + message) {}
+
+EUnspecifiedError::~EUnspecifiedError() noexcept = default;
+
 void failAssertion(const char* file, int line, const char* text) {
     throw Exception(formatStr("%s:%d: Assertion failed: '%s'", file, line, text));
 }

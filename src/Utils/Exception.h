@@ -29,6 +29,16 @@ class QUENX_EXPORT Exception : public std::exception {
     std::string m_message;
 };
 
+/// A caller's mistake in the arguments of a method. What answers the caller tells it from every other
+/// failure, so it is known to all floors.
+class QUENX_EXPORT EUnspecifiedError : public Exception {
+  public:
+    explicit EUnspecifiedError(const std::string& message);
+    EUnspecifiedError(const EUnspecifiedError&) = default;
+    EUnspecifiedError& operator=(const EUnspecifiedError&) = default;
+    ~EUnspecifiedError() noexcept override;
+};
+
 /// Throws the Exception "file:line: Assertion failed: 'text'" (built from a text, so with prefix).
 [[noreturn]] QUENX_EXPORT void failAssertion(const char* file, int line, const char* text);
 

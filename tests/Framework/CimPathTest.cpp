@@ -1,4 +1,4 @@
-#include "Framework/Model/CimPath.h"
+#include "Framework/Model/CimValue.h"
 
 #include <gtest/gtest.h>
 

@@ -1,6 +1,6 @@
 #include <string>
 
-#include "Framework/Model/CimPath.h"
+#include "Framework/Model/CimValue.h"
 #include "Fuzz/Require.h"
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {

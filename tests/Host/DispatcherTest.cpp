@@ -4,7 +4,7 @@
 
 #include "CimXml/ResponseWriter.h"
 #include "CimXml/WireCheck.h"
-#include "Host/Operations/ProviderNamespace.h"
+#include "Framework/Requests/CimRequests.h"
 #include "Support/TestModel.h"
 
 namespace {
@@ -29,7 +29,7 @@ CimPath link() {
 class DispatcherTest : public ::testing::Test {
   protected:
     DispatcherTest()
-        : m_dispatcher({std::make_shared<host::ProviderNamespace>("root/cimv2")},
+        : m_dispatcher({std::make_shared<core::CimRequests>("root/cimv2")},
                        {2, std::chrono::seconds(60), std::chrono::seconds(100)}) {
         m_agent.links().instances.add(new test::Link(m_a, m_b));
     }
@@ -217,20 +217,45 @@ TEST_F(DispatcherTest, CallsMethods) {
     EXPECT_EQ(statusIn(invoke(a, "Work", {text, {"Numbers", {{}, std::string("7"), false}}})), 0);
     EXPECT_EQ(statusIn(invoke(a, "Work", {text})), 0);
 
-    EXPECT_EQ(statusIn(invoke(a, "Work", {})), 1);  // in the provider's own words
     EXPECT_EQ(statusIn(invoke(gadget("a", "9"), "Work", {text})), 6);
     EXPECT_EQ(statusIn(invoke(CimPath("Unknown", {}), "Work", {text})), 6);
-    EXPECT_EQ(statusIn(invoke(CimPath("Test_Gadget", {}), "Work", {text})), 4);
     EXPECT_EQ(statusIn(invoke(CimPath("Test_Gadget", {}), "Work", {text}, true)), 16);
+    EXPECT_EQ(statusIn(invoke(CimPath("Test_Gadget", {{"ID", std::string("a")}}), "Work", {text})), 4);
     EXPECT_EQ(statusIn(invoke(a, "Play", {})), 17);
     EXPECT_EQ(statusIn(invoke(a, "NotImplemented", {})), 16);
     EXPECT_EQ(statusIn(invoke(a, "Work", {text, text})), 4);
     EXPECT_EQ(statusIn(invoke(a, "Work", {text, {"Unknown", {}}})), 4);
-    for (const std::string bad : {"", "x", "65536", "-1", "1.5"})
-        EXPECT_EQ(statusIn(invoke(a, "Work", {text, numbers({bad})})), 4) << bad;
-    cimxml::RawArgument withNull = numbers({"5"});
-    withNull.value.hasNullElement = true;
-    EXPECT_EQ(statusIn(invoke(a, "Work", {text, withNull})), 4);
+}
+
+TEST_F(DispatcherTest, TakesOnlyArgumentsOfTheDeclaredKind) {
+    const CimPath a = gadget("a", "1");
+    const auto statusOf = [&](std::optional<core::CimType> stated, decltype(cimxml::RawValue::data) data) {
+        const cimxml::RawArgument text{"Text", {{}, std::string("x"), false}};
+        return statusIn(invoke(a, "Work", {text, {"Numbers", {stated, std::move(data), false}}}));
+    };
+    // Without a stated type the declaration decides; some clients state the width that the value needs.
+    for (const auto type : {std::optional<core::CimType>(), std::optional(core::CimType::Uint16),
+                            std::optional(core::CimType::Uint8), std::optional(core::CimType::Sint64)}) {
+        EXPECT_EQ(statusOf(type, std::vector<std::string>{"5"}), 0);
+        for (const std::string bad : {"", "x", "65536", "-1", "1.5"})
+            EXPECT_EQ(statusOf(type, bad), 4) << bad;
+    }
+    for (const auto type : {core::CimType::String, core::CimType::Boolean, core::CimType::Real32,
+                            core::CimType::Datetime, core::CimType::Reference})
+        EXPECT_EQ(statusOf(type, std::vector<std::string>{"1"}), 4) << core::typeName(type);
+    EXPECT_EQ(statusOf({}, gadget("b", "2")), 4);
+
+    const auto workOn = [&](cimxml::RawValue text) { return invoke(a, "Work", {{"Text", std::move(text)}}); };
+    EXPECT_EQ(statusIn(workOn({{}, std::vector<std::string>{"x"}, false})), 4);
+    EXPECT_EQ(statusIn(workOn({core::CimType::Uint16, std::string("5"), false})), 4);
+    // The provider says what is missing, in its own words; its own failures are none of the client's.
+    const cimxml::Response missing = workOn({});
+    EXPECT_EQ(statusIn(missing), 4);
+    EXPECT_EQ(std::get<cimxml::Failure>(missing.content).description,
+              "SMASHv2:EUnspecifiedError:Text is missing");
+    EXPECT_EQ(statusIn(invoke(a, "Work", {})), 4);
+    EXPECT_EQ(statusIn(workOn({{}, std::string("fail"), false})), 1);
+    EXPECT_EQ(statusIn(invoke(a, "Work", {{"Numbers", {{}, std::vector<std::string>{"5"}, true}}})), 4);
 }
 
 TEST_F(DispatcherTest, PullsToTheEnd) {

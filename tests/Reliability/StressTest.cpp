@@ -5,7 +5,8 @@
 #include <random>
 #include <thread>
 
-#include "Framework/Classes/InstanceRange.h"
+#include "Framework/Classes/CimBroker.h"
+#include "Framework/Classes/InstanceList.h"
 #include "Framework/Classes/RequestScope.h"
 #include "Providers/SoftwareUpdate/JobThread.h"
 #include "Providers/SoftwareUpdate/UpdateTest.h"
@@ -70,8 +71,8 @@ StressTest::StressTest() {
                  {"eth1", goodImage()},
                  {"eth2", file("rtl.rom", rtl)},
                  {"eth4", file("vmx.rom", vmx)}};
-    for (const core::ClassDeclaration& declaration : m_requests.enumerateClasses("", true))
-        m_classes.push_back(declaration.name);
+    for (const core::ClassChain& chain : m_requests.enumerateClasses("", true))
+        m_classes.push_back(chain.front()->name);
     // Knows how many adapters are being written to at once, and takes its time for it.
     m_backend->hook = [this](const std::string& operation, const std::string&) {
         if (operation == "updateCapabilityWord") --m_writing;

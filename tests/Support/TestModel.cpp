@@ -3,6 +3,7 @@
 #include <numeric>
 
 #include "Framework/Model/CimError.h"
+#include "Utils/Exception.h"
 
 namespace test {
 
@@ -48,7 +49,8 @@ Gadget::Gadget(const std::string& id, unsigned int number) : Gadget() {
 
 unsigned int Gadget::Work(core::CimPropertyList& in, core::CimPropertyList& out, core::CimInstance*& job) {
     const auto* text = dynamic_cast<core::CimPropertyString*>(in.getPropertyByName("Text"));
-    if (text == nullptr || text->IsNull()) throw std::runtime_error("Text is missing");
+    if (text == nullptr || text->IsNull()) throw utils::EUnspecifiedError("Text is missing");
+    if (text->get() == "fail") throw std::runtime_error("out of order");
     const auto numbers = dynamic_cast<core::CimPropertyUint16_arr*>(in.getPropertyByName("Numbers"))->get();
     auto* echo = dynamic_cast<core::CimPropertyString*>(out.getPropertyByName("Echo"));
     *echo = echo->get() + text->get();

@@ -31,7 +31,7 @@ class Gadget : public Thing {
     std::string getClassName() const override { return "Test_Gadget"; }
 
     /// Returns the sum of Numbers, hands its Text back as Echo, and itself as the job. Throws for a null
-    /// Text.
+    /// Text as for a client's mistake, and for the Text "fail" as for a failure of its own.
     unsigned int Work(core::CimPropertyList& in, core::CimPropertyList& out, core::CimInstance*& job);
 
     core::CimPropertyString ID{"ID", this};

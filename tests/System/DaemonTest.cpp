@@ -108,7 +108,7 @@ TEST(DaemonTest, AnswersMistakesByTheirStatus) {
         {"di", "Quenx_RegisteredProfile.InstanceID=\"none\"", {}, "(6) CIM_ERR_NOT_FOUND"},
         {"mi", service, {"Caption=\"x\""}, "(7) CIM_ERR_NOT_SUPPORTED"},
         {"ci", "Quenx_ConcreteJob.InstanceID=\"x\"", {"InstanceID=\"x\""}, "(7) CIM_ERR_NOT_SUPPORTED"},
-        {"cm", service, {"InstallFromURI.InstallOptions=5"}, "(1) CIM_ERR_FAILED: "},
+        {"cm", service, {"InstallFromURI.InstallOptions=5"}, "(4) CIM_ERR_INVALID_PARAMETER: "},
         {"cm", service, {"Nothing"}, "(17) CIM_ERR_METHOD_NOT_FOUND"},
     };
     for (const auto& row : table) {

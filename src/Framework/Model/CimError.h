@@ -1,7 +1,9 @@
 #pragma once
 
+#include <new>
 #include <stdexcept>
 #include <string>
+#include <utility>
 
 #include "Utils/Export.h"
 
@@ -30,7 +32,7 @@ enum class CimStatus {
 };
 
 /// A request that ends with a CIM status. Unlike the providers' exceptions it does not log itself: a client's
-/// wrong request is the client's affair.
+/// mistake must not fill the server's log.
 class QUENX_EXPORT CimError : public std::runtime_error {
   public:
     CimError(CimStatus status, const std::string& description);
@@ -41,5 +43,22 @@ class QUENX_EXPORT CimError : public std::runtime_error {
   private:
     CimStatus m_status;
 };
+
+/// Runs the body of a request. Whatever it throws beside CimError becomes CimStatus::Failed, with the
+/// provider's own text; but the lack of memory passes, since there may be none to build an answer in.
+template <class Body>
+auto withCimErrors(Body&& body) {
+    try {
+        return std::forward<Body>(body)();
+    } catch (const CimError&) {
+        throw;
+    } catch (const std::bad_alloc&) {
+        throw;
+    } catch (const std::exception& failure) {
+        throw CimError(CimStatus::Failed, failure.what());
+    } catch (...) {
+        throw CimError(CimStatus::Failed, "the provider failed without saying why");
+    }
+}
 
 }  // namespace core

@@ -4,6 +4,7 @@
 #include <set>
 
 #include "Framework/Model/CimInstance.h"
+#include "Framework/Model/CimValue.h"
 
 namespace core {
 

@@ -45,6 +45,7 @@ class QUENX_EXPORT CimPath {
     const std::string& getClassName() const { return m_className; }
     const std::string& getNamespace() const { return m_namespace; }
     const std::string& getHost() const { return m_host; }
+    /// To look at them, include CimValue.h: a key holds a value, and a value may hold a path.
     const std::vector<CimKey>& getKeys() const { return m_keys; }
 
     /// Leading and trailing slashes are dropped.
@@ -73,6 +74,3 @@ class QUENX_EXPORT CimPath {
 };
 
 }  // namespace core
-
-// A path's keys hold values and a value may hold a path, so the two headers complete each other.
-#include "Framework/Model/CimValue.h"  // IWYU pragma: export

@@ -28,7 +28,7 @@ struct Inherited {
         referenceClasses[foldName(property.getName())] = referenceClassOf(property);
         if (property.isKey()) keys.insert(foldName(property.getName()));
     }
-    bool isNews(const CimProperty& property) const {
+    bool isNewOrChanged(const CimProperty& property) const {
         const std::string name = foldName(property.getName());
         const auto inherited = referenceClasses.find(name);
         return inherited == referenceClasses.end() || (property.isKey() && !keys.contains(name)) ||
@@ -52,7 +52,7 @@ std::vector<PropertyDeclaration> readProperties(const CimClassInfo& info) {
     std::size_t begin = 0;
     for (const auto& [declaring, end] : recorder.marks) {
         for (std::size_t i = begin; i < end; ++i) {
-            if (declaring == &info && inherited.isNews(*all[i])) result.push_back(declare(*all[i]));
+            if (declaring == &info && inherited.isNewOrChanged(*all[i])) result.push_back(declare(*all[i]));
         }
         for (std::size_t i = begin; i < end; ++i)
             inherited.add(*all[i]);
@@ -108,9 +108,39 @@ ClassChain declarationsOf(const CimClassInfo& info) {
     return chain;
 }
 
+std::vector<ClassChain> chainsOf(std::vector<ClassDeclaration> declarations) {
+    std::map<std::string, std::shared_ptr<const ClassDeclaration>> byName;
+    std::vector<ClassChain> chains;
+    for (ClassDeclaration& each : declarations) {
+        chains.push_back({std::make_shared<const ClassDeclaration>(std::move(each))});
+        byName.emplace(foldName(chains.back().front()->name), chains.back().front());
+    }
+    for (ClassChain& chain : chains) {
+        // No chain is longer than all the classes: a server may send a class that is its own superclass.
+        while (chain.size() <= chains.size()) {
+            const auto superclass = byName.find(foldName(chain.back()->superclass));
+            if (superclass == byName.end()) break;
+            chain.push_back(superclass->second);
+        }
+    }
+    return chains;
+}
+
 bool derivesFrom(const ClassChain& chain, std::string_view className) {
     return std::any_of(chain.begin(), chain.end(),
                        [&](const auto& declaration) { return sameName(declaration->name, className); });
+}
+
+bool isBelow(const ClassChain& chain, std::string_view className, bool deep) {
+    const ClassDeclaration& first = *chain.front();
+    if (className.empty()) return deep || first.superclass.empty();
+    if (sameName(first.name, className)) return false;
+    return deep ? derivesFrom(chain, className) : sameName(first.superclass, className);
+}
+
+bool isAssociation(const ClassChain& chain) {
+    return std::any_of(chain.begin(), chain.end(),
+                       [](const auto& declaration) { return declaration->isAssociation; });
 }
 
 const MethodDeclaration* findMethod(const ClassChain& chain, std::string_view name) {

@@ -50,8 +50,19 @@ using ClassChain = std::vector<std::shared_ptr<const ClassDeclaration>>;
 /// Thread-safe.
 QUENX_EXPORT ClassChain declarationsOf(const CimClassInfo& info);
 
+/// Builds the chain of each class from declarations of them and their superclasses; one that is not among
+/// them ends a chain.
+QUENX_EXPORT std::vector<ClassChain> chainsOf(std::vector<ClassDeclaration> declarations);
+
 /// Whether a class of that name is in the chain.
 QUENX_EXPORT bool derivesFrom(const ClassChain& chain, std::string_view className);
+
+/// Whether the chain's first class stands below the named one: directly, or at any depth with `deep`. An
+/// empty name stands above the roots.
+QUENX_EXPORT bool isBelow(const ClassChain& chain, std::string_view className, bool deep);
+
+/// An association, or derived from one.
+QUENX_EXPORT bool isAssociation(const ClassChain& chain);
 
 /// The method, looked up from the class towards the root; null when no class of the chain declares it.
 QUENX_EXPORT const MethodDeclaration* findMethod(const ClassChain& chain, std::string_view name);

@@ -1,25 +1,24 @@
-// Instances: enumerating, reading, deleting.
+// Instances: enumerating, reading, deleting. And the classes that they are of.
 #include "Framework/Requests/CimRequests.h"
 
-#include <algorithm>
 #include <functional>
+#include <map>
 #include <set>
 
-#include "Framework/Classes/RequestScope.h"
-#include "Framework/Requests/RequestTools.h"
-#include "Framework/Requests/ServedModel.h"
+#include "Framework/Classes/InstanceList.h"
+#include "Framework/Model/CimError.h"
+#include "Framework/Requests/ServedClasses.h"
 
 namespace core {
 
 namespace {
 
-/// Calls the visitor once per path; a class that lists one instance twice is no error of the client's.
-void visitInstances(const ServedModel& model, const std::string& className,
+/// Calls the visitor once per path: two agents may serve the same instance, or one class list it twice.
+void visitInstances(const ServedClasses& classes, const std::string& className,
                     const std::function<void(CimInstance&, CimPath)>& visit) {
     std::set<std::string> seen;
-    for (const ModelClass& each : model.derivedFrom(className)) {
-        auto instances = each.agent->getInstances(each.served->name);
-        for (CimInstance* instance = instances.first(); instance != nullptr; instance = instances.next()) {
+    for (const ServedClass* each : classes.derivedFrom(className)) {
+        for (CimInstance* instance : InstanceRange(each->object->getInstances())) {
             CimPath path = CimPath::of(*instance);
             if (seen.insert(path.toString()).second) visit(*instance, std::move(path));
         }
@@ -28,37 +27,33 @@ void visitInstances(const ServedModel& model, const std::string& className,
 
 }  // namespace
 
-const PropertyValue* InstanceValue::find(std::string_view name) const {
-    const auto found = std::find_if(properties.begin(), properties.end(), [&](const PropertyValue& property) {
-        return sameName(property.name, name);
-    });
-    return found == properties.end() ? nullptr : &*found;
-}
+CimOperations::~CimOperations() = default;
 
-CimRequests::CimRequests(std::string namespaceName, CimBroker* broker)
+CimRequests::CimRequests(std::string namespaceName)
+    : CimRequests(std::move(namespaceName), *GetCimBroker()) {}
+
+CimRequests::CimRequests(std::string namespaceName, CimBroker& broker)
     : m_namespace(std::move(namespaceName)), m_broker(broker) {}
 
+CimRequests::~CimRequests() = default;
+
 std::vector<InstanceValue> CimRequests::enumerateInstances(const std::string& className,
-                                                           const PropertyFilter& filter) const {
-    const RequestScope scope;
-    return answering([&] {
-        const ServedModel model(*m_broker);
-        model.requireClass(className);
+                                                           const PropertyFilter& filter) {
+    const ServedClasses classes(m_broker);
+    return withCimErrors([&] {
         std::vector<InstanceValue> result;
-        visitInstances(model, className, [&](CimInstance& instance, CimPath path) {
+        visitInstances(classes, className, [&](CimInstance& instance, CimPath path) {
             result.push_back(readInstance(instance, std::move(path), filter, m_namespace));
         });
         return result;
     });
 }
 
-std::vector<CimPath> CimRequests::enumerateInstanceNames(const std::string& className) const {
-    const RequestScope scope;
-    return answering([&] {
-        const ServedModel model(*m_broker);
-        model.requireClass(className);
+std::vector<CimPath> CimRequests::enumerateInstanceNames(const std::string& className) {
+    const ServedClasses classes(m_broker);
+    return withCimErrors([&] {
         std::vector<CimPath> result;
-        visitInstances(model, className, [&](CimInstance&, CimPath path) {
+        visitInstances(classes, className, [&](CimInstance&, CimPath path) {
             path.completeNamespace(m_namespace);
             result.push_back(std::move(path));
         });
@@ -66,34 +61,54 @@ std::vector<CimPath> CimRequests::enumerateInstanceNames(const std::string& clas
     });
 }
 
-InstanceValue CimRequests::getInstance(CimPath path, const PropertyFilter& filter) const {
-    const RequestScope scope;
-    return answering([&] {
-        CimInstance& instance = requireInstance(*m_broker, path);
+InstanceValue CimRequests::getInstance(const CimPath& path, const PropertyFilter& filter) {
+    const ServedClasses classes(m_broker);
+    return withCimErrors([&] {
+        CimPath typed = classes.typed(path);
+        CimInstance& instance = classes.requireInstance(typed);
         return readInstance(instance, CimPath::of(instance), filter, m_namespace);
     });
 }
 
-void CimRequests::deleteInstance(CimPath path) const {
-    const RequestScope scope;
-    answering([&] {
-        const ServedModel model(*m_broker);
-        const std::vector<ModelClass> candidates = model.named(path.getClassName());
-        if (candidates.empty()) model.requireClass(path.getClassName());
-        bool supported = false;
-        for (const ModelClass& each : candidates) {
-            if (each.served->deleteInstance == nullptr) continue;
-            supported = true;
-            const int code = each.served->deleteInstance(*each.served->object, path);
+void CimRequests::deleteInstance(const CimPath& path) {
+    const ServedClasses classes(m_broker);
+    withCimErrors([&] {
+        CimPath typed = classes.typed(path);
+        bool isSupported = false;
+        for (const ServedClass* each : classes.named(typed.getClassName())) {
+            if (each->deleteInstance == nullptr) continue;
+            isSupported = true;
+            const int code = each->deleteInstance(*each->object, typed);
             if (code == 0) return;
             if (code == kDeleteNotFound) continue;
-            throw CimError(CimStatus::Failed,
-                           "the deletion of " + path.toString() + " ended with code " + std::to_string(code));
+            throw CimError(CimStatus::Failed, "the deletion of " + typed.toString() + " ended with code " +
+                                                  std::to_string(code));
         }
-        if (supported) throw CimError(CimStatus::NotFound, path.toString() + " names no instance");
-        requireInstance(*m_broker, path);
-        throw CimError(CimStatus::NotSupported, "instances of " + path.getClassName() + " cannot be deleted");
+        if (isSupported) throw CimError(CimStatus::NotFound, typed.toString() + " names no instance");
+        classes.requireInstance(typed);
+        throw CimError(CimStatus::NotSupported,
+                       "instances of " + typed.getClassName() + " cannot be deleted");
     });
+}
+
+ClassChain CimRequests::getClass(const std::string& className) {
+    return ServedClasses(m_broker).chainOf(className);
+}
+
+std::vector<ClassChain> CimRequests::enumerateClasses(const std::string& className, bool deep) {
+    const ServedClasses classes(m_broker);
+    if (!className.empty()) classes.requireChain(className);
+    std::map<std::string, ClassChain> found;
+    for (const ServedClass* each : classes.all()) {
+        for (auto first = each->chain.begin(); first != each->chain.end(); ++first) {
+            ClassChain rest(first, each->chain.end());
+            if (isBelow(rest, className, deep)) found.emplace((*first)->name, std::move(rest));
+        }
+    }
+    std::vector<ClassChain> result;
+    for (auto& [name, chain] : found)
+        result.push_back(std::move(chain));
+    return result;
 }
 
 }  // namespace core

@@ -4,12 +4,11 @@
 #include <set>
 #include <unordered_map>
 
-#include "Framework/Classes/InstanceRange.h"
-#include "Framework/Classes/RequestScope.h"
+#include "Framework/Classes/InstanceList.h"
+#include "Framework/Model/CimError.h"
 #include "Framework/Model/CimPropertyRef.h"
 #include "Framework/Requests/CimRequests.h"
-#include "Framework/Requests/RequestTools.h"
-#include "Framework/Requests/ServedModel.h"
+#include "Framework/Requests/ServedClasses.h"
 
 namespace core {
 
@@ -37,12 +36,11 @@ bool isRole(const std::string& wanted, const End& end) {
 }
 
 /// Visits every association instance that refers to the path in the wanted role, with the index of that end.
-void visitReferences(const ServedModel& model, const CimPath& path, const std::string& associationClass,
+void visitReferences(const ServedClasses& classes, const CimPath& path, const std::string& associationClass,
                      const std::string& role,
                      const std::function<void(CimInstance&, const std::vector<End>&, std::size_t)>& visit) {
-    for (const ModelClass& each : model.associations(associationClass)) {
-        auto instances = each.agent->getInstances(each.served->name);
-        for (CimInstance* instance = instances.first(); instance != nullptr; instance = instances.next()) {
+    for (const ServedClass* each : classes.associations(associationClass)) {
+        for (CimInstance* instance : InstanceRange(each->object->getInstances())) {
             const std::vector<End> ends = endsOf(*instance);
             for (std::size_t i = 0; i < ends.size(); ++i) {
                 if (isRole(role, ends[i]) && ends[i].path.names(path)) visit(*instance, ends, i);
@@ -51,21 +49,31 @@ void visitReferences(const ServedModel& model, const CimPath& path, const std::s
     }
 }
 
+bool leadsTo(const ServedClasses& classes, const AssociationFilter& by, const End& end) {
+    if (!isRole(by.resultRole, end)) return false;
+    return by.resultClass.empty() || derivesFrom(classes.chainOf(end.path.getClassName()), by.resultClass);
+}
+
+/// The path of the object that the walk starts at, which need not exist. The classes in the filter must.
+CimPath startOf(const ServedClasses& classes, const CimPath& path, const AssociationFilter& by) {
+    CimPath typed = classes.typed(path);
+    for (const std::string& name : {by.associationClass, by.resultClass}) {
+        if (!name.empty() && classes.chainOf(name).empty()) {
+            throw CimError(CimStatus::InvalidParameter, "no class \"" + name + "\"");
+        }
+    }
+    return typed;
+}
+
 /// The paths at the other ends, each once.
-std::vector<CimPath> farEnds(CimBroker& broker, const CimPath& path, const AssociationFilter& by) {
-    const ServedModel model(broker);
+std::vector<CimPath> farEnds(const ServedClasses& classes, const CimPath& path, const AssociationFilter& by) {
     std::set<std::string> seen;
     std::vector<CimPath> result;
-    visitReferences(model, path, by.associationClass, by.role,
+    visitReferences(classes, startOf(classes, path, by), by.associationClass, by.role,
                     [&](CimInstance&, const std::vector<End>& ends, std::size_t near) {
                         for (std::size_t i = 0; i < ends.size(); ++i) {
-                            if (i == near || !isRole(by.resultRole, ends[i])) continue;
-                            const CimPath& far = ends[i].path;
-                            if (!by.resultClass.empty() &&
-                                !derivesFrom(model.chainOf(far.getClassName()), by.resultClass)) {
-                                continue;
-                            }
-                            if (seen.insert(far.toString()).second) result.push_back(far);
+                            if (i == near || !leadsTo(classes, by, ends[i])) continue;
+                            if (seen.insert(ends[i].path.toString()).second) result.push_back(ends[i].path);
                         }
                     });
     return result;
@@ -99,12 +107,11 @@ class InstanceFinder {
 };
 
 /// The association instances that refer to the path, each once.
-void visitAssociations(CimBroker& broker, const CimPath& path, const AssociationFilter& by,
+void visitAssociations(const ServedClasses& classes, const CimPath& path, const AssociationFilter& by,
                        const std::function<void(CimInstance&, CimPath)>& visit) {
-    const ServedModel model(broker);
     const std::string& wanted = by.associationClass.empty() ? by.resultClass : by.associationClass;
     std::set<std::string> seen;
-    visitReferences(model, path, wanted, by.role,
+    visitReferences(classes, startOf(classes, path, by), wanted, by.role,
                     [&](CimInstance& association, const std::vector<End>&, std::size_t) {
                         CimPath own = CimPath::of(association);
                         if (seen.insert(own.toString()).second) visit(association, std::move(own));
@@ -114,12 +121,12 @@ void visitAssociations(CimBroker& broker, const CimPath& path, const Association
 }  // namespace
 
 std::vector<InstanceValue> CimRequests::associators(const CimPath& path, const AssociationFilter& by,
-                                                    const PropertyFilter& filter) const {
-    const RequestScope scope;
-    return answering([&] {
+                                                    const PropertyFilter& filter) {
+    const ServedClasses classes(m_broker);
+    return withCimErrors([&] {
         std::vector<InstanceValue> result;
-        InstanceFinder finder(*m_broker);
-        for (CimPath& far : farEnds(*m_broker, path, by)) {
+        InstanceFinder finder(m_broker);
+        for (CimPath& far : farEnds(classes, path, by)) {
             if (CimInstance* instance = finder.find(far)) {
                 result.push_back(readInstance(*instance, std::move(far), filter, m_namespace));
             }
@@ -128,10 +135,10 @@ std::vector<InstanceValue> CimRequests::associators(const CimPath& path, const A
     });
 }
 
-std::vector<CimPath> CimRequests::associatorNames(const CimPath& path, const AssociationFilter& by) const {
-    const RequestScope scope;
-    return answering([&] {
-        std::vector<CimPath> result = farEnds(*m_broker, path, by);
+std::vector<CimPath> CimRequests::associatorNames(const CimPath& path, const AssociationFilter& by) {
+    const ServedClasses classes(m_broker);
+    return withCimErrors([&] {
+        std::vector<CimPath> result = farEnds(classes, path, by);
         for (CimPath& far : result)
             far.completeNamespace(m_namespace);
         return result;
@@ -139,22 +146,22 @@ std::vector<CimPath> CimRequests::associatorNames(const CimPath& path, const Ass
 }
 
 std::vector<InstanceValue> CimRequests::references(const CimPath& path, const AssociationFilter& by,
-                                                   const PropertyFilter& filter) const {
-    const RequestScope scope;
-    return answering([&] {
+                                                   const PropertyFilter& filter) {
+    const ServedClasses classes(m_broker);
+    return withCimErrors([&] {
         std::vector<InstanceValue> result;
-        visitAssociations(*m_broker, path, by, [&](CimInstance& association, CimPath own) {
+        visitAssociations(classes, path, by, [&](CimInstance& association, CimPath own) {
             result.push_back(readInstance(association, std::move(own), filter, m_namespace));
         });
         return result;
     });
 }
 
-std::vector<CimPath> CimRequests::referenceNames(const CimPath& path, const AssociationFilter& by) const {
-    const RequestScope scope;
-    return answering([&] {
+std::vector<CimPath> CimRequests::referenceNames(const CimPath& path, const AssociationFilter& by) {
+    const ServedClasses classes(m_broker);
+    return withCimErrors([&] {
         std::vector<CimPath> result;
-        visitAssociations(*m_broker, path, by, [&](CimInstance&, CimPath own) {
+        visitAssociations(classes, path, by, [&](CimInstance&, CimPath own) {
             own.completeNamespace(m_namespace);
             result.push_back(std::move(own));
         });

@@ -1,10 +1,12 @@
 // Calling methods: the arguments are checked against the declaration and completed here, once for all fronts.
 #include <algorithm>
 
-#include "Framework/Classes/RequestScope.h"
+#include "Framework/Model/CimError.h"
+#include "Framework/Model/CimInstance.h"
 #include "Framework/Requests/CimRequests.h"
-#include "Framework/Requests/RequestTools.h"
-#include "Framework/Requests/ServedModel.h"
+#include "Framework/Requests/ServedClasses.h"
+#include "Framework/Requests/TypedPath.h"
+#include "Utils/Exception.h"
 
 namespace core {
 
@@ -24,31 +26,86 @@ const Argument* findArgument(const std::vector<Argument>& arguments, std::string
     return found == arguments.end() ? nullptr : &*found;
 }
 
-void checkNames(const MethodDeclaration& method, const std::vector<Argument>& arguments) {
-    for (const Argument& argument : arguments) {
-        const bool known = std::any_of(
-            method.parameters.begin(), method.parameters.end(),
-            [&](const ParameterDeclaration& parameter) { return sameName(parameter.name, argument.name); });
-        if (!known) {
-            throw CimError(CimStatus::InvalidParameter, method.name + " has no parameter " + argument.name);
-        }
-        if (findArgument(arguments, argument.name) != &argument) {
-            throw CimError(CimStatus::InvalidParameter, argument.name + " is given twice");
-        }
+/// What a client may mix up within, such as the widths of integers.
+enum class Kind { Boolean, Text, Integer, Real, Datetime, Reference };
+
+Kind kindOf(CimType type) {
+    switch (type) {
+        case CimType::Boolean:
+            return Kind::Boolean;
+        case CimType::String:
+        case CimType::Char16:
+            return Kind::Text;
+        case CimType::Datetime:
+            return Kind::Datetime;
+        case CimType::Reference:
+            return Kind::Reference;
+        default:
+            return isReal(type) ? Kind::Real : Kind::Integer;
     }
+}
+
+/// A path written as a text would be guessed at, so a reference is never read from one.
+std::optional<CimScalar> typedElement(CimType type, const CimScalar& value, const Argument& given) {
+    const auto* text = given.isUntyped ? std::get_if<std::string>(&value) : nullptr;
+    if (text != nullptr && type != CimType::Reference) return parseScalar(type, *text);
+    return kindOf(type) == kindOf(given.value.type) ? convertScalar(type, value) : std::nullopt;
+}
+
+/// The value as the declaration wants it; nothing where it is of another kind, or does not fit.
+std::optional<CimValue> typedValue(const ParameterDeclaration& declared, const Argument& given,
+                                   const ClassLookup& classes) {
+    if (given.value.isNull()) return CimValue::null(declared.type, declared.isArray);
+    const CimScalar* single = given.value.scalar();
+    if (single == nullptr && !declared.isArray) return std::nullopt;
+    std::vector<CimScalar> typed;
+    for (const CimScalar& each : single == nullptr ? *given.value.elements() : std::vector{*single}) {
+        auto value = typedElement(declared.type, each, given);
+        if (!value) return std::nullopt;
+        if (auto* path = std::get_if<CimPath>(&*value)) *path = typedReference(*path, classes);
+        typed.push_back(std::move(*value));
+    }
+    // An array of one element may come as the element alone.
+    if (declared.isArray) return CimValue::arrayOf(declared.type, std::move(typed));
+    return CimValue::of(declared.type, std::move(typed.front()));
+}
+
+/// The arguments with their declared names and types.
+std::vector<Argument> typedArguments(const MethodDeclaration& method, const std::vector<Argument>& arguments,
+                                     const ClassLookup& classes) {
+    std::vector<Argument> result;
+    for (const Argument& given : arguments) {
+        const auto declared =
+            std::find_if(method.parameters.begin(), method.parameters.end(),
+                         [&](const auto& parameter) { return sameName(parameter.name, given.name); });
+        if (declared == method.parameters.end()) {
+            throw CimError(CimStatus::InvalidParameter, method.name + " has no parameter " + given.name);
+        }
+        if (findArgument(result, declared->name) != nullptr) {
+            throw CimError(CimStatus::InvalidParameter, declared->name + " is given twice");
+        }
+        auto value = typedValue(*declared, given, classes);
+        if (!value) {
+            throw CimError(CimStatus::InvalidParameter,
+                           "parameter " + declared->name + " takes a value of type " +
+                               std::string(typeName(declared->type)) + (declared->isArray ? "[]" : ""));
+        }
+        result.push_back({declared->name, std::move(*value)});
+    }
+    return result;
 }
 
 /// A value that the client gives for an output parameter goes to the method with the outputs: it decides.
 CallLists listsFor(const MethodDeclaration& method, const std::vector<Argument>& arguments) {
-    checkNames(method, arguments);
     CallLists lists;
     for (const ParameterDeclaration& parameter : method.parameters) {
         const Argument* given = findArgument(arguments, parameter.name);
         const bool isOutput = parameter.direction == CimDirection::Out;
+        // What is required and missing stays absent: the provider says so in its own words.
         if (given == nullptr && !isOutput && !parameter.optional) continue;
         CimPropertyList& list = isOutput ? lists.out : lists.in;
-        CimProperty& property = list.add(parameter.name, CimValue::null(parameter.type, parameter.isArray));
-        if (given != nullptr && !given->value.isNull()) property.setValue(given->value);
+        list.add(parameter.name,
+                 given == nullptr ? CimValue::null(parameter.type, parameter.isArray) : given->value);
     }
     return lists;
 }
@@ -63,43 +120,60 @@ bool sameValues(const CimValue& left, const CimValue& right) {
 }
 
 /// What the method has put out: of its outputs, not those that still are what the client gave for them.
-MethodResult resultOf(unsigned int returnValue, const CallLists& lists,
-                      const std::vector<Argument>& arguments, const CimInstance* handedBack,
-                      const std::string& namespaceName) {
-    MethodResult result{returnValue, {}};
+std::vector<Argument> outputsOf(const CallLists& lists, const std::vector<Argument>& arguments,
+                                const CimInstance* handedBack, const std::string& namespaceName) {
+    std::vector<Argument> outputs;
     for (const auto& property : lists.out.getProperties()) {
         if (sameName(property->getName(), kJobParameter)) continue;  // an instance, handed back
         CimValue value = property->getValue();
         const Argument* given = findArgument(arguments, property->getName());
         if (given != nullptr && sameValues(given->value, value)) continue;
-        if (!value.isNull()) result.outputs.push_back({property->getName(), std::move(value)});
+        if (!value.isNull()) outputs.push_back({property->getName(), std::move(value)});
     }
     if (handedBack != nullptr) {
         CimPath path = CimPath::of(*handedBack);
         path.completeNamespace(namespaceName);
-        result.outputs.push_back(
+        outputs.push_back(
             {std::string(kJobParameter), CimValue::of(CimType::Reference, CimScalar(std::move(path)))});
     }
-    return result;
+    return outputs;
+}
+
+/// A method reports a wrong argument by an exception, anything else by its return value.
+unsigned int call(CimInstance& instance, const std::string& method, CallLists& lists,
+                  CimInstance*& handedBack) {
+    try {
+        return instance.invokeMethod(method, lists.in, lists.out, handedBack);
+    } catch (const utils::EUnspecifiedError& refusal) {
+        throw CimError(CimStatus::InvalidParameter, refusal.what());
+    }
 }
 
 }  // namespace
 
-MethodResult CimRequests::invokeMethod(CimPath path, const std::string& method,
-                                       const std::vector<Argument>& arguments) const {
-    const RequestScope scope;
-    return answering([&] {
-        CimInstance& instance = requireInstance(*m_broker, path);
-        const ClassChain chain = ServedModel(*m_broker).chainOf(instance.getClassName());
+MethodResult CimRequests::invokeMethod(const CimPath& path, const std::string& method,
+                                       const std::vector<Argument>& arguments) {
+    const ServedClasses classes(m_broker);
+    return withCimErrors([&]() -> MethodResult {
+        const ClassChain chain = classes.chainOf(path.getClassName());
+        if (chain.empty()) {
+            throw CimError(CimStatus::NotFound, "no class \"" + path.getClassName() + "\" is served");
+        }
         const MethodDeclaration* declared = findMethod(chain, method);
         if (declared == nullptr) {
-            throw CimError(CimStatus::MethodNotFound, instance.getClassName() + " has no method " + method);
+            throw CimError(CimStatus::MethodNotFound, chain.front()->name + " has no method " + method);
         }
-        CallLists lists = listsFor(*declared, arguments);
+        if (!path.isInstancePath()) {
+            throw CimError(CimStatus::MethodNotAvailable, declared->name + " is called on an instance");
+        }
+        CimPath typed = classes.typed(path);
+        const std::vector<Argument> given = typedArguments(
+            *declared, arguments, [&](const std::string& name) { return classes.chainOf(name); });
+        CimInstance& instance = classes.requireInstance(typed);
+        CallLists lists = listsFor(*declared, given);
         CimInstance* handedBack = nullptr;
-        const unsigned int returnValue =
-            instance.invokeMethod(declared->name, lists.in, lists.out, handedBack);
-        return resultOf(returnValue, lists, arguments, handedBack, m_namespace);
+        const unsigned int returnValue = call(instance, declared->name, lists, handedBack);
+        return {returnValue, outputsOf(lists, given, handedBack, m_namespace), declared->returnType};
     });
 }
 

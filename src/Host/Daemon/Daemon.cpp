@@ -1,13 +1,13 @@
 #include "Host/Daemon/Daemon.h"
 
 #include "Framework/Classes/Retirement.h"
+#include "Framework/Requests/CimRequests.h"
 #include "Host/Authentication/PamChecker.h"
 #include "Host/Authentication/UsersFile.h"
 #include "Host/Daemon/Providers.h"
 #include "Host/Daemon/Report.h"
 #include "Host/Daemon/RunningJobs.h"
 #include "Host/Operations/InteropNamespace.h"
-#include "Host/Operations/ProviderNamespace.h"
 #include "MidAPI/ma.h"
 #include "Utils/Os/Linux/linux.h"
 
@@ -27,7 +27,7 @@ Daemon::Daemon(const Settings& settings) : m_settings(settings) {
 Daemon::~Daemon() = default;
 
 std::unique_ptr<Dispatcher> Daemon::makeDispatcher() const {
-    const auto implementation = std::make_shared<ProviderNamespace>(m_namespace);
+    const auto implementation = std::make_shared<core::CimRequests>(m_namespace);
     Dispatcher::Namespaces namespaces{implementation};
     std::vector<std::string> names{m_namespace};
     for (const char* name : {"interop", "root/interop"}) {
@@ -100,7 +100,8 @@ std::string Daemon::unfinished() {
         return std::to_string(requests) + " requests in flight";
     }
     m_dispatcher->shutDown();
-    const std::vector<RunningJob> jobs = runningJobs(core::CimRequests(m_namespace));
+    core::CimRequests requests(m_namespace);
+    const std::vector<RunningJob> jobs = runningJobs(requests);
     if (!jobs.empty()) return "the flash of " + describe(jobs);
     return core::isRetiring() ? "the flash of a job that was deleted" : "";
 }

@@ -18,10 +18,10 @@ T valueOf(const core::InstanceValue& instance, std::string_view name) {
 
 }  // namespace
 
-std::vector<RunningJob> runningJobs(const core::CimRequests& requests) {
+std::vector<RunningJob> runningJobs(core::CimOperations& operations) {
     std::vector<RunningJob> running;
     try {
-        for (const core::InstanceValue& job : requests.enumerateInstances("CIM_ConcreteJob")) {
+        for (const core::InstanceValue& job : operations.enumerateInstances("CIM_ConcreteJob")) {
             const auto state = valueOf<std::uint64_t>(job, "JobState");
             if (state != kStarting && state != kRunning) continue;
             running.push_back(

@@ -3,7 +3,7 @@
 #include <string>
 #include <vector>
 
-#include "Framework/Requests/CimRequests.h"
+#include "Framework/Requests/CimOperations.h"
 
 namespace host {
 
@@ -15,7 +15,7 @@ struct RunningJob {
 
 /// The jobs that the providers are working on: those that serve a CIM_ConcreteJob which is starting or
 /// running. Empty when nobody serves jobs.
-std::vector<RunningJob> runningJobs(const core::CimRequests& requests);
+std::vector<RunningJob> runningJobs(core::CimOperations& operations);
 
 /// "Job#1 at 42 %, Job#2 at 7 %"
 std::string describe(const std::vector<RunningJob>& jobs);

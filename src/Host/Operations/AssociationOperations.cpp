@@ -1,5 +1,4 @@
-#include "Host/Operations/Handlers.h"
-#include "Host/Operations/InstanceTools.h"
+#include "Host/Operations/Operations.h"
 
 namespace host {
 
@@ -12,21 +11,15 @@ using cimxml::ResultKind;
 core::CimPath sourceOf(const OperationContext& context, const Parameters& parameters) {
     const std::string_view name = parameters.isGiven("ObjectName") ? "ObjectName" : "InstanceName";
     if (parameters.isClassName(name)) {
-        context.model.requireClass(parameters.className(name));
+        requireClass(context.target, parameters.className(name), core::CimStatus::InvalidClass);
         throw core::CimError(core::CimStatus::NotSupported, "associations of classes are not served");
     }
-    return instancePath(context, parameters.path(name));
+    return parameters.path(name);
 }
 
-core::AssociationFilter filterOf(const OperationContext& context, const Parameters& parameters) {
-    core::AssociationFilter filter{parameters.className("AssocClass"), parameters.className("ResultClass"),
-                                   parameters.text("Role"), parameters.text("ResultRole")};
-    for (const std::string& name : {filter.associationClass, filter.resultClass}) {
-        if (!name.empty() && !context.model.knowsClass(name)) {
-            throw core::CimError(core::CimStatus::InvalidParameter, "no class \"" + name + "\"");
-        }
-    }
-    return filter;
+core::AssociationFilter filterOf(const Parameters& parameters) {
+    return {parameters.className("AssocClass"), parameters.className("ResultClass"), parameters.text("Role"),
+            parameters.text("ResultRole")};
 }
 
 IntrinsicResult objects(const OperationContext& context, const Parameters& parameters,
@@ -34,7 +27,7 @@ IntrinsicResult objects(const OperationContext& context, const Parameters& param
     IntrinsicResult result;
     result.kind = ResultKind::ObjectsWithPath;
     result.instances = std::move(instances);
-    if (parameters.flag("IncludeClassOrigin", false)) addOrigins(context.model, result);
+    if (parameters.flag("IncludeClassOrigin", false)) addOrigins(context.target, result);
     return result;
 }
 
@@ -49,26 +42,24 @@ IntrinsicResult objectPaths(std::vector<core::CimPath> paths) {
 
 IntrinsicResult associators(const OperationContext& context, const Parameters& parameters) {
     const core::CimPath source = sourceOf(context, parameters);
-    return objects(
-        context, parameters,
-        context.model.associators(source, filterOf(context, parameters), parameters.list("PropertyList")));
+    return objects(context, parameters,
+                   context.target.associators(source, filterOf(parameters), parameters.list("PropertyList")));
 }
 
 IntrinsicResult associatorNames(const OperationContext& context, const Parameters& parameters) {
     const core::CimPath source = sourceOf(context, parameters);
-    return objectPaths(context.model.associatorNames(source, filterOf(context, parameters)));
+    return objectPaths(context.target.associatorNames(source, filterOf(parameters)));
 }
 
 IntrinsicResult references(const OperationContext& context, const Parameters& parameters) {
     const core::CimPath source = sourceOf(context, parameters);
-    return objects(
-        context, parameters,
-        context.model.references(source, filterOf(context, parameters), parameters.list("PropertyList")));
+    return objects(context, parameters,
+                   context.target.references(source, filterOf(parameters), parameters.list("PropertyList")));
 }
 
 IntrinsicResult referenceNames(const OperationContext& context, const Parameters& parameters) {
     const core::CimPath source = sourceOf(context, parameters);
-    return objectPaths(context.model.referenceNames(source, filterOf(context, parameters)));
+    return objectPaths(context.target.referenceNames(source, filterOf(parameters)));
 }
 
 }  // namespace host

@@ -1,7 +1,7 @@
 #include <algorithm>
 
 #include "Host/Operations/ClassElements.h"
-#include "Host/Operations/Handlers.h"
+#include "Host/Operations/Operations.h"
 
 namespace host {
 
@@ -16,17 +16,24 @@ ClassOptions optionsOf(const Parameters& parameters) {
 }
 
 std::vector<core::ClassChain> wantedClasses(const OperationContext& context, const Parameters& parameters) {
-    const std::string className = parameters.className("ClassName");
-    if (parameters.isGiven("ClassName")) context.model.requireClass(className);
-    return context.model.classes(className, parameters.flag("DeepInheritance", false));
+    return context.target.enumerateClasses(parameters.className("ClassName"),
+                                           parameters.flag("DeepInheritance", false));
 }
 
 }  // namespace
 
+core::ClassChain requireClass(core::CimOperations& target, const std::string& className,
+                              core::CimStatus otherwise) {
+    core::ClassChain chain = target.getClass(className);
+    if (!chain.empty()) return chain;
+    throw core::CimError(otherwise, "no class \"" + className + "\" in " + target.getNamespace());
+}
+
 IntrinsicResult getClass(const OperationContext& context, const Parameters& parameters) {
     IntrinsicResult result;
     result.kind = ResultKind::Classes;
-    const core::ClassChain chain = context.model.getClass(parameters.className("ClassName"));
+    const core::ClassChain chain =
+        requireClass(context.target, parameters.className("ClassName"), core::CimStatus::NotFound);
     result.classes.push_back(classElement(chain, optionsOf(parameters)));
     return result;
 }

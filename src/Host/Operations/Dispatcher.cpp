@@ -2,8 +2,7 @@
 
 #include <new>
 
-#include "Host/Operations/Handlers.h"
-#include "Host/Operations/PathTyping.h"
+#include "CimXml/ValueReader.h"
 
 namespace host {
 
@@ -21,17 +20,30 @@ void requirePrivilege(Privilege privilege, const Caller& caller) {
     }
 }
 
-/// What an operation that is not in the table needs: nothing, since it does nothing.
-constexpr Operation kUnknown{"", Privilege::Read, {}, notSupported};
+/// An argument as the message has it: of the type that the client states, else left to the declaration.
+core::Argument argumentOf(const cimxml::RawArgument& raw) {
+    const auto& data = raw.value.data;
+    const bool isArray = std::holds_alternative<std::vector<std::string>>(data) ||
+                         std::holds_alternative<std::vector<core::CimPath>>(data);
+    const bool isReference = std::holds_alternative<core::CimPath>(data) ||
+                             std::holds_alternative<std::vector<core::CimPath>>(data);
+    const core::CimType open = isReference ? core::CimType::Reference : core::CimType::String;
+    auto value = cimxml::typedValueOf(raw.value, raw.value.type.value_or(open), isArray);
+    if (!value) {
+        throw CimError(CimStatus::InvalidParameter,
+                       "parameter " + raw.name + " does not hold a value of its stated type");
+    }
+    return {raw.name, std::move(*value), !raw.value.type};
+}
 
 }  // namespace
 
 Dispatcher::Dispatcher(Namespaces namespaces, const PullLimits& limits)
     : m_namespaces(std::move(namespaces)), m_pulls(limits) {}
 
-const NamespaceModel& Dispatcher::model(const std::string& name) const {
+core::CimOperations& Dispatcher::findNamespace(const std::string& name) const {
     for (const auto& each : m_namespaces) {
-        if (core::sameName(each->name(), name)) return *each;
+        if (core::sameName(each->getNamespace(), name)) return *each;
     }
     throw CimError(CimStatus::InvalidNamespace, "no namespace \"" + name + "\"");
 }
@@ -39,11 +51,9 @@ const NamespaceModel& Dispatcher::model(const std::string& name) const {
 IntrinsicResult Dispatcher::call(const cimxml::IntrinsicCall& call, const Caller& caller) {
     const Operation* operation = findOperation(call.operation);
     if (operation != nullptr) requirePrivilege(operation->privilege, caller);
-    const NamespaceModel& target = model(call.namespaceName);
+    core::CimOperations& target = findNamespace(call.namespaceName);
     if (operation == nullptr) {
-        // The parameters of an unknown operation are not looked at.
-        const cimxml::IntrinsicCall bare{call.operation, call.namespaceName, {}};
-        return kUnknown.handler({target, caller, m_pulls, call.operation}, Parameters(bare, {}));
+        throw CimError(CimStatus::NotSupported, "operation " + call.operation + " is not supported");
     }
     return operation->handler({target, caller, m_pulls, operation->name},
                               Parameters(call, operation->parameters));
@@ -51,18 +61,12 @@ IntrinsicResult Dispatcher::call(const cimxml::IntrinsicCall& call, const Caller
 
 ExtrinsicResult Dispatcher::call(const cimxml::MethodCall& call, const Caller& caller) {
     requirePrivilege(methodPrivilege(), caller);
-    const NamespaceModel& target = model(call.object.getNamespace());
-    const core::ClassChain chain = target.getClass(call.object.getClassName());
-    const core::MethodDeclaration* method = core::findMethod(chain, call.method);
-    if (method == nullptr) {
-        throw CimError(CimStatus::MethodNotFound, chain.front()->name + " has no method " + call.method);
-    }
-    if (call.isClass) {
-        throw CimError(CimStatus::MethodNotAvailable, method->name + " is called on an instance");
-    }
-    const core::CimPath path = typedPath(target, chain, call.object);
-    return {method->returnType,
-            target.invokeMethod(path, method->name, typedArguments(target, *method, call.arguments))};
+    core::CimOperations& target = findNamespace(call.object.getNamespace());
+    std::vector<core::Argument> arguments;
+    for (const cimxml::RawArgument& each : call.arguments)
+        arguments.push_back(argumentOf(each));
+    core::MethodResult result = target.invokeMethod(call.object, call.method, arguments);
+    return {result.returnType, std::move(result)};
 }
 
 cimxml::Response Dispatcher::dispatch(const cimxml::Request& request, const Caller& caller) {

@@ -6,16 +6,14 @@
 
 #include "CimXml/Request.h"
 #include "CimXml/Response.h"
-#include "Host/Operations/NamespaceModel.h"
-#include "Host/Operations/Operation.h"
-#include "Host/Operations/PullContexts.h"
+#include "Host/Operations/Operations.h"
 
 namespace host {
 
 /// Carries requests to the namespaces and turns every outcome into a response. Thread-safe.
 class Dispatcher {
   public:
-    using Namespaces = std::vector<std::shared_ptr<const NamespaceModel>>;
+    using Namespaces = std::vector<std::shared_ptr<core::CimOperations>>;
 
     explicit Dispatcher(Namespaces namespaces, const PullLimits& limits = {});
 
@@ -28,7 +26,7 @@ class Dispatcher {
   private:
     cimxml::IntrinsicResult call(const cimxml::IntrinsicCall& call, const Caller& caller);
     cimxml::ExtrinsicResult call(const cimxml::MethodCall& call, const Caller& caller);
-    const NamespaceModel& model(const std::string& name) const;
+    core::CimOperations& findNamespace(const std::string& name) const;
 
     const Namespaces m_namespaces;
     PullContexts m_pulls;

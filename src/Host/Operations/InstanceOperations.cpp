@@ -1,9 +1,7 @@
 #include <algorithm>
 
 #include "Host/Operations/ClassElements.h"
-#include "Host/Operations/Handlers.h"
-#include "Host/Operations/InstanceTools.h"
-#include "Host/Operations/PathTyping.h"
+#include "Host/Operations/Operations.h"
 
 namespace host {
 
@@ -12,29 +10,23 @@ namespace {
 using cimxml::IntrinsicResult;
 using cimxml::ResultKind;
 
+const core::PropertyFilter kNoProperties{std::vector<std::string>()};
+
 /// The properties of the named class only, narrowed by the client's list.
 core::PropertyFilter shallowFilter(const core::ClassChain& chain, const core::PropertyFilter& wanted) {
     std::vector<std::string> names = propertyNames(chain);
-    if (!wanted) return names;
-    std::erase_if(names, [&](const std::string& name) {
-        return std::none_of(wanted->begin(), wanted->end(),
-                            [&](const std::string& each) { return core::sameName(each, name); });
-    });
+    std::erase_if(names, [&](const std::string& name) { return !core::isWanted(wanted, name); });
     return names;
 }
 
 }  // namespace
 
-core::CimPath instancePath(const OperationContext& context, const core::CimPath& path) {
-    return typedPath(context.model, context.model.requireClass(path.getClassName()), path);
-}
-
-void addOrigins(const NamespaceModel& model, IntrinsicResult& result) {
+void addOrigins(core::CimOperations& target, IntrinsicResult& result) {
     auto origins = std::make_shared<cimxml::Origins>();
     for (const core::InstanceValue& instance : result.instances) {
         const std::string& name = instance.path.getClassName();
         const auto [entry, isNew] = origins->try_emplace(core::foldName(name));
-        if (isNew) entry->second = originsOf(model.findClass(name));
+        if (isNew) entry->second = originsOf(target.getClass(name));
     }
     result.origins = std::move(origins);
 }
@@ -42,9 +34,9 @@ void addOrigins(const NamespaceModel& model, IntrinsicResult& result) {
 IntrinsicResult getInstance(const OperationContext& context, const Parameters& parameters) {
     IntrinsicResult result;
     result.kind = ResultKind::Instance;
-    const core::CimPath path = instancePath(context, parameters.path("InstanceName"));
-    result.instances.push_back(context.model.getInstance(path, parameters.list("PropertyList")));
-    if (parameters.flag("IncludeClassOrigin", false)) addOrigins(context.model, result);
+    result.instances.push_back(
+        context.target.getInstance(parameters.path("InstanceName"), parameters.list("PropertyList")));
+    if (parameters.flag("IncludeClassOrigin", false)) addOrigins(context.target, result);
     return result;
 }
 
@@ -52,31 +44,29 @@ IntrinsicResult enumerateInstances(const OperationContext& context, const Parame
     IntrinsicResult result;
     result.kind = ResultKind::NamedInstances;
     const std::string className = parameters.className("ClassName");
-    const core::ClassChain chain = context.model.requireClass(className);
     core::PropertyFilter filter = parameters.list("PropertyList");
-    if (!parameters.flag("DeepInheritance", true)) filter = shallowFilter(chain, filter);
-    result.instances = context.model.enumerateInstances(className, filter);
-    if (parameters.flag("IncludeClassOrigin", false)) addOrigins(context.model, result);
+    if (!parameters.flag("DeepInheritance", true))
+        filter = shallowFilter(context.target.getClass(className), filter);
+    result.instances = context.target.enumerateInstances(className, filter);
+    if (parameters.flag("IncludeClassOrigin", false)) addOrigins(context.target, result);
     return result;
 }
 
 IntrinsicResult enumerateInstanceNames(const OperationContext& context, const Parameters& parameters) {
     IntrinsicResult result;
     result.kind = ResultKind::InstanceNames;
-    const std::string className = parameters.className("ClassName");
-    context.model.requireClass(className);
-    result.paths = context.model.enumerateInstanceNames(className);
+    result.paths = context.target.enumerateInstanceNames(parameters.className("ClassName"));
     return result;
 }
 
 IntrinsicResult deleteInstance(const OperationContext& context, const Parameters& parameters) {
-    context.model.deleteInstance(instancePath(context, parameters.path("InstanceName")));
+    context.target.deleteInstance(parameters.path("InstanceName"));
     return {};
 }
 
 IntrinsicResult createInstance(const OperationContext& context, const Parameters& parameters) {
     const std::string& className = parameters.instance("NewInstance")->className;
-    context.model.requireClass(className);
+    requireClass(context.target, className, core::CimStatus::InvalidClass);
     throw core::CimError(core::CimStatus::NotSupported, "instances of " + className + " cannot be created");
 }
 
@@ -85,10 +75,10 @@ IntrinsicResult modifyInstance(const OperationContext& context, const Parameters
     if (!body.path) {
         throw core::CimError(core::CimStatus::InvalidParameter, "ModifiedInstance names no instance");
     }
-    const core::CimPath path = instancePath(context, *body.path);
-    context.model.getInstance(path, core::PropertyFilter(std::vector<std::string>()));
+    // A client that is wrong about the instance hears that first.
+    context.target.getInstance(*body.path, kNoProperties);
     throw core::CimError(core::CimStatus::NotSupported,
-                         "instances of " + path.getClassName() + " cannot be modified");
+                         "instances of " + body.path->getClassName() + " cannot be modified");
 }
 
 }  // namespace host

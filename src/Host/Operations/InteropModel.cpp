@@ -79,30 +79,15 @@ class InstanceBuilder {
 }  // namespace
 
 InteropModel::InteropModel(std::vector<std::string> namespaces, std::string systemName)
-    : m_namespaces(std::move(namespaces)), m_systemName(std::move(systemName)) {
-    for (ClassDeclaration& declaration : declarations()) {
-        m_declarations.push_back(std::make_shared<const ClassDeclaration>(std::move(declaration)));
-    }
-}
+    : m_namespaces(std::move(namespaces)),
+      m_systemName(std::move(systemName)),
+      m_classes(core::chainsOf(declarations())) {}
 
 core::ClassChain InteropModel::findClass(const std::string& className) const {
-    core::ClassChain chain;
-    std::string wanted = className;
-    while (!wanted.empty()) {
-        const auto found = std::find_if(m_declarations.begin(), m_declarations.end(),
-                                        [&](const auto& each) { return core::sameName(each->name, wanted); });
-        if (found == m_declarations.end()) break;
-        chain.push_back(*found);
-        wanted = (*found)->superclass;
-    }
-    return chain;
-}
-
-std::vector<core::ClassChain> InteropModel::classes() const {
-    std::vector<core::ClassChain> chains;
-    for (const auto& declaration : m_declarations)
-        chains.push_back(findClass(declaration->name));
-    return chains;
+    const auto found = std::find_if(m_classes.begin(), m_classes.end(), [&](const core::ClassChain& chain) {
+        return core::sameName(chain.front()->name, className);
+    });
+    return found == m_classes.end() ? core::ClassChain() : *found;
 }
 
 std::vector<core::InstanceValue> InteropModel::instances(const std::string& namespaceName) const {

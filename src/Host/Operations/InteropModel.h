@@ -3,7 +3,8 @@
 #include <string>
 #include <vector>
 
-#include "Framework/Requests/CimRequests.h"
+#include "Framework/Model/ClassDeclaration.h"
+#include "Framework/Requests/RequestValues.h"
 
 namespace host {
 
@@ -17,7 +18,7 @@ class InteropModel {
     /// Empty for a class that is not the host's own.
     core::ClassChain findClass(const std::string& className) const;
     /// All of them, superclasses included.
-    std::vector<core::ClassChain> classes() const;
+    const std::vector<core::ClassChain>& classes() const { return m_classes; }
     /// The instances, with paths in the given namespace.
     std::vector<core::InstanceValue> instances(const std::string& namespaceName) const;
 
@@ -27,7 +28,7 @@ class InteropModel {
 
     const std::vector<std::string> m_namespaces;
     const std::string m_systemName;
-    std::vector<std::shared_ptr<const core::ClassDeclaration>> m_declarations;
+    const std::vector<core::ClassChain> m_classes;
 };
 
 }  // namespace host

@@ -2,8 +2,8 @@
 
 #include <memory>
 
+#include "Framework/Requests/CimOperations.h"
 #include "Host/Operations/InteropModel.h"
-#include "Host/Operations/NamespaceModel.h"
 
 namespace host {
 
@@ -11,47 +11,46 @@ namespace host {
 /// registered profiles with what conforms to them and what they refer to. The profiles come from the
 /// providers; here their paths are in this namespace, while those of the elements that conform to them are in
 /// the implementation namespace, where a client goes on.
-class InteropNamespace : public NamespaceModel {
+class InteropNamespace : public core::CimOperations {
   public:
-    InteropNamespace(std::string name, std::shared_ptr<const NamespaceModel> implementation,
+    InteropNamespace(std::string name, std::shared_ptr<core::CimOperations> implementation,
                      std::shared_ptr<const InteropModel> model);
 
-    const std::string& name() const override { return m_name; }
+    const std::string& getNamespace() const override { return m_name; }
     std::vector<core::InstanceValue> enumerateInstances(const std::string& className,
-                                                        const core::PropertyFilter& filter) const override;
-    std::vector<core::CimPath> enumerateInstanceNames(const std::string& className) const override;
-    core::InstanceValue getInstance(const core::CimPath& path,
-                                    const core::PropertyFilter& filter) const override;
+                                                        const core::PropertyFilter& filter) override;
+    std::vector<core::CimPath> enumerateInstanceNames(const std::string& className) override;
+    core::InstanceValue getInstance(const core::CimPath& path, const core::PropertyFilter& filter) override;
     std::vector<core::InstanceValue> associators(const core::CimPath& path, const core::AssociationFilter& by,
-                                                 const core::PropertyFilter& filter) const override;
+                                                 const core::PropertyFilter& filter) override;
     std::vector<core::CimPath> associatorNames(const core::CimPath& path,
-                                               const core::AssociationFilter& by) const override;
+                                               const core::AssociationFilter& by) override;
     std::vector<core::InstanceValue> references(const core::CimPath& path, const core::AssociationFilter& by,
-                                                const core::PropertyFilter& filter) const override;
+                                                const core::PropertyFilter& filter) override;
     std::vector<core::CimPath> referenceNames(const core::CimPath& path,
-                                              const core::AssociationFilter& by) const override;
-    /// No class here has methods.
+                                              const core::AssociationFilter& by) override;
+    /// No class here has methods that can be called.
     core::MethodResult invokeMethod(const core::CimPath& path, const std::string& method,
-                                    const std::vector<core::Argument>& arguments) const override;
-    void deleteInstance(const core::CimPath& path) const override;
-    core::ClassChain getClass(const std::string& className) const override;
-    std::vector<core::ClassChain> classes(const std::string& className, bool deep) const override;
-    bool knowsClass(const std::string& className) const override {
-        return NamespaceModel::knowsClass(className) || m_implementation->knowsClass(className);
-    }
+                                    const std::vector<core::Argument>& arguments) override;
+    void deleteInstance(const core::CimPath& path) override;
+    core::ClassChain getClass(const std::string& className) override;
+    std::vector<core::ClassChain> enumerateClasses(const std::string& className, bool deep) override;
 
   private:
     /// Whether the providers' class is shown here.
     bool isShown(const core::ClassChain& chain) const;
     /// The providers' classes to enumerate for the instances of a class here.
     std::vector<std::string> sources(const std::string& className) const;
+    /// Whether associations may lead from the path through the filter: none do from and to what is the
+    /// manager's own. CimError when the path or the filter is wrong.
+    bool hasAssociations(const core::CimPath& path, const core::AssociationFilter& by);
     core::CimPath relocated(const core::CimPath& path) const;
     core::InstanceValue relocated(core::InstanceValue instance) const;
     std::vector<core::CimPath> relocated(const std::vector<core::CimPath>& paths) const;
     std::vector<core::InstanceValue> relocated(std::vector<core::InstanceValue> instances) const;
 
     const std::string m_name;
-    const std::shared_ptr<const NamespaceModel> m_implementation;
+    const std::shared_ptr<core::CimOperations> m_implementation;
     const std::shared_ptr<const InteropModel> m_model;
 };
 

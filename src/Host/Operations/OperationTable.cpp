@@ -1,12 +1,13 @@
 #include <algorithm>
 #include <array>
 
-#include "Host/Operations/Handlers.h"
+#include "Host/Operations/Operations.h"
 
 namespace host {
 
 namespace {
 
+using cimxml::IntrinsicResult;
 using Kind = ParameterKind;
 
 constexpr ParameterSpec kClassName{"ClassName", Kind::ClassName};
@@ -68,6 +69,11 @@ constexpr ParameterSpec kOpenReferencePaths[] = {kInstanceName, kResultClass, kR
                                                  kFilter,       kTimeout,     kContinue, kCount};
 constexpr ParameterSpec kPull[] = {kContext, kCount};
 constexpr ParameterSpec kClose[] = {kContext};
+
+IntrinsicResult refuseQuery(const OperationContext&, const Parameters& parameters) {
+    throw core::CimError(core::CimStatus::QueryLanguageNotSupported,
+                         "queries in " + parameters.text("QueryLanguage") + " are not supported");
+}
 
 /// Every operation that is served, with what a caller must be allowed. Handlers do not ask again. Whatever is
 /// not here, such as changing classes, qualifiers or single properties, is answered as not supported.

@@ -2,6 +2,8 @@
 
 #include <algorithm>
 
+#include "Framework/Model/CimError.h"
+
 namespace host {
 
 namespace {

@@ -7,7 +7,7 @@
 #include <string_view>
 
 #include "CimXml/Request.h"
-#include "Framework/Requests/CimRequests.h"
+#include "Framework/Requests/RequestValues.h"
 
 namespace host {
 

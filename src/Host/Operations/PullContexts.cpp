@@ -5,6 +5,8 @@
 #include <algorithm>
 #include <array>
 
+#include "Framework/Model/CimError.h"
+
 namespace host {
 
 namespace {

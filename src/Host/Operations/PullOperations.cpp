@@ -1,6 +1,6 @@
 #include <algorithm>
 
-#include "Host/Operations/Handlers.h"
+#include "Host/Operations/Operations.h"
 
 namespace host {
 
@@ -25,7 +25,7 @@ constexpr Opening kOpenings[] = {
     {"OpenReferenceInstancePaths", referenceNames, ResultKind::InstancePaths}};
 
 PullOwner ownerOf(const OperationContext& context, ResultKind kind) {
-    return {core::foldName(context.model.name()), context.caller.user, kind};
+    return {core::foldName(context.target.getNamespace()), context.caller.user, kind};
 }
 
 void refuseFilters(const Parameters& parameters) {

@@ -4,7 +4,7 @@
 #include <utility>
 #include <vector>
 
-#include "Framework/Classes/InstanceRange.h"
+#include "Framework/Classes/InstanceList.h"
 #include "Utils/Os/Linux/Mutex.h"
 
 /// A class object's instances, one for each key, kept from call to call while the keys are the same. An

@@ -4,7 +4,7 @@
 #include <memory>
 
 #include "Framework/Classes/CimBroker.h"
-#include "Framework/Classes/InstanceRange.h"
+#include "Framework/Classes/InstanceList.h"
 #include "MidAPI/ma.h"
 #include "Providers/SoftwareInventory/Quenx_EthernetPort.h"
 #include "Providers/SoftwareInventory/Quenx_SoftwareIdentity.h"

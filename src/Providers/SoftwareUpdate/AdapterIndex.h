@@ -6,7 +6,7 @@
 #include <utility>
 #include <vector>
 
-#include "Framework/Classes/InstanceRange.h"
+#include "Framework/Classes/InstanceList.h"
 #include "Providers/InventoryInterfaces.h"
 #include "Providers/Schema/CIM_ManagedElement.h"
 

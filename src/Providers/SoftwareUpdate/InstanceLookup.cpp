@@ -1,7 +1,7 @@
 #include "Providers/SoftwareUpdate/InstanceLookup.h"
 
 #include "Framework/Classes/CimBroker.h"
-#include "Framework/Classes/InstanceRange.h"
+#include "Framework/Classes/InstanceList.h"
 #include "Providers/InventoryInterfaces.h"
 #include "Providers/SoftwareUpdate/InstallOptions.h"
 #include "Utils/Log.h"

@@ -3,7 +3,7 @@
 #include <string>
 #include <vector>
 
-#include "Framework/Model/CimPath.h"
+#include "Framework/Model/CimValue.h"
 #include "Providers/SoftwareUpdate/MethodResults.h"
 
 namespace core {

@@ -4,7 +4,7 @@
 #include <string>
 #include <vector>
 
-#include "Framework/Model/CimPath.h"
+#include "Framework/Model/CimValue.h"
 #include "Framework/Model/CimPropertyList.h"
 
 /// How the methods read their arguments. Every operation throws utils::EUnspecifiedError for an argument that

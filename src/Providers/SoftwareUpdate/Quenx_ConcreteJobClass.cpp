@@ -1,7 +1,7 @@
 #include "Providers/SoftwareUpdate/Quenx_ConcreteJobClass.h"
 
 #include "Framework/Classes/CimBroker.h"
-#include "Framework/Classes/InstanceRange.h"
+#include "Framework/Classes/InstanceList.h"
 #include "Framework/Classes/RequestScope.h"
 #include "Providers/SoftwareUpdate/AdapterClaim.h"
 #include "Providers/SoftwareUpdate/VerifyJobResult.h"

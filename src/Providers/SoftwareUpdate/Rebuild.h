@@ -1,6 +1,6 @@
 #pragma once
 
-#include "Framework/Classes/InstanceRange.h"
+#include "Framework/Classes/InstanceList.h"
 
 /// Fills a list anew and publishes it in one step, so that two rebuilds at once neither double nor drop
 /// anything. Where it is given up before that, by an exception, the list is left empty.

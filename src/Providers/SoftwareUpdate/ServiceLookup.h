@@ -1,6 +1,6 @@
 #pragma once
 
-#include "Framework/Classes/InstanceRange.h"
+#include "Framework/Classes/InstanceList.h"
 
 /// Enumerates the installation services, whoever provides them.
 utils::SafeList<core::CimInstance*>::Iterator allServices();

@@ -14,11 +14,6 @@ class EInvalidParameter : public Exception {
     explicit EInvalidParameter(std::string message) : Exception("EInvalidParameter:" + message) {}
 };
 
-class EUnspecifiedError : public Exception {
-  public:
-    explicit EUnspecifiedError(std::string message) : Exception("EUnspecifiedError:" + message) {}
-};
-
 }  // namespace utils
 
 /// The target adapter is already being updated.

@@ -5,6 +5,7 @@
 #include <set>
 #include <thread>
 
+#include "Framework/Classes/CimBroker.h"
 #include "Providers/SoftwareUpdate/UpdateTest.h"
 #include "Utils/Os/Linux/linux.h"
 

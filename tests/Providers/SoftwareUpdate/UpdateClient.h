@@ -46,7 +46,8 @@ class UpdateClient {
     std::vector<std::string> table(const std::string& className,
                                    const std::vector<const char*>& properties) const;
 
-    core::CimRequests m_requests{"root/cimv2"};
+    /// Has no state of its own.
+    mutable core::CimRequests m_requests{"root/cimv2"};
 };
 
 // Arguments of methods.

@@ -1,18 +1,12 @@
-#include "Framework/Requests/RequestTools.h"
+#include "Framework/Requests/RequestValues.h"
 
 #include <algorithm>
 
-#include "Framework/Model/CimPropertyRef.h"
-#include "Framework/Requests/ServedModel.h"
+#include "Framework/Model/CimInstance.h"
 
 namespace core {
 
 namespace {
-
-bool isWanted(const PropertyFilter& filter, const char* name) {
-    return !filter || std::any_of(filter->begin(), filter->end(),
-                                  [&](const std::string& wanted) { return sameName(wanted, name); });
-}
 
 PropertyValue readProperty(const CimProperty& property, const std::string& namespaceName) {
     PropertyValue result{property.getName(), property.getValue(), property.isKey(), {}};
@@ -25,10 +19,23 @@ PropertyValue readProperty(const CimProperty& property, const std::string& names
 
 }  // namespace
 
+const PropertyValue* InstanceValue::find(std::string_view name) const {
+    const auto found = std::find_if(properties.begin(), properties.end(), [&](const PropertyValue& property) {
+        return sameName(property.name, name);
+    });
+    return found == properties.end() ? nullptr : &*found;
+}
+
+bool isWanted(const PropertyFilter& filter, std::string_view name) {
+    return !filter || std::any_of(filter->begin(), filter->end(),
+                                  [&](const std::string& wanted) { return sameName(wanted, name); });
+}
+
 InstanceValue readInstance(CimInstance& instance, CimPath path, const PropertyFilter& filter,
                            const std::string& namespaceName) {
     InstanceValue result{std::move(path), {}};
     result.path.completeNamespace(namespaceName);
+    // One lock around all properties: a refresh on another thread shows whole or not at all.
     const RecursiveLocker lock(instance.getMutex());
     const std::vector<CimProperty*> properties = instance.getProperties();
     result.properties.reserve(properties.size());
@@ -37,17 +44,6 @@ InstanceValue readInstance(CimInstance& instance, CimPath path, const PropertyFi
             result.properties.push_back(readProperty(*property, namespaceName));
     }
     return result;
-}
-
-CimInstance& requireInstance(CimBroker& broker, CimPath& path) {
-    if (!path.isValid()) {
-        throw CimError(
-            CimStatus::InvalidParameter,
-            "'" + path.toString() + "' is no object path; one reads " + "namespace:Class.Key=\"value\"");
-    }
-    if (CimInstance* instance = broker.getInstanceByPath(path)) return *instance;
-    ServedModel(broker).requireClass(path.getClassName());
-    throw CimError(CimStatus::NotFound, path.toString() + " names no instance");
 }
 
 }  // namespace core

@@ -1,0 +1,69 @@
+#include "Framework/Requests/ServedClasses.h"
+
+#include <algorithm>
+#include <iterator>
+
+#include "Framework/Model/CimError.h"
+#include "Framework/Requests/TypedPath.h"
+
+namespace core {
+
+ServedClasses::ServedClasses(CimBroker& broker) : m_broker(broker), m_uses(broker.useAgents()) {
+    for (const AgentUse& use : m_uses) {
+        const auto classes = use.agent().getClasses().getAll();
+        m_classes.insert(m_classes.end(), classes.begin(), classes.end());
+    }
+}
+
+std::vector<const ServedClass*> ServedClasses::derivedFrom(std::string_view className) const {
+    std::vector<const ServedClass*> result;
+    std::copy_if(m_classes.begin(), m_classes.end(), std::back_inserter(result),
+                 [&](const ServedClass* each) { return core::derivesFrom(each->chain, className); });
+    if (result.empty()) requireChain(className);
+    return result;
+}
+
+std::vector<const ServedClass*> ServedClasses::named(std::string_view className) const {
+    std::vector<const ServedClass*> result;
+    std::copy_if(m_classes.begin(), m_classes.end(), std::back_inserter(result),
+                 [&](const ServedClass* each) { return sameName(each->name, className); });
+    return result;
+}
+
+std::vector<const ServedClass*> ServedClasses::associations(std::string_view className) const {
+    std::vector<const ServedClass*> result;
+    std::copy_if(m_classes.begin(), m_classes.end(), std::back_inserter(result),
+                 [&](const ServedClass* each) {
+                     return isAssociation(each->chain) &&
+                            (className.empty() || core::derivesFrom(each->chain, className));
+                 });
+    return result;
+}
+
+ClassChain ServedClasses::chainOf(std::string_view className) const {
+    for (const ServedClass* each : m_classes) {
+        const ClassChain& chain = each->chain;
+        const auto found = std::find_if(chain.begin(), chain.end(), [&](const auto& declaration) {
+            return sameName(declaration->name, className);
+        });
+        if (found != chain.end()) return {found, chain.end()};
+    }
+    return {};
+}
+
+ClassChain ServedClasses::requireChain(std::string_view className) const {
+    ClassChain chain = chainOf(className);
+    if (!chain.empty()) return chain;
+    throw CimError(CimStatus::InvalidClass, "no class \"" + std::string(className) + "\" is served");
+}
+
+CimPath ServedClasses::typed(const CimPath& path) const {
+    return typedPath(path, [this](const std::string& name) { return chainOf(name); });
+}
+
+CimInstance& ServedClasses::requireInstance(CimPath& path) const {
+    if (CimInstance* instance = m_broker.getInstanceByPath(path)) return *instance;
+    throw CimError(CimStatus::NotFound, path.toString() + " names no instance");
+}
+
+}  // namespace core
