@@ -1,5 +1,7 @@
 # What `cmake --install` puts where. The programs find the libraries, and the libraries each other, from where they are
 # themselves, so that an installation can be staged and moved.
+set(CMAKE_INSTALL_DEFAULT_DIRECTORY_PERMISSIONS  # whatever the mask of whoever installs
+    OWNER_READ OWNER_WRITE OWNER_EXECUTE GROUP_READ GROUP_EXECUTE WORLD_READ WORLD_EXECUTE)
 set(quenx_libraries Quenx_Utils Quenx_CimFramework Quenx_MidAPI Quenx_CimSchema Quenx_SoftwareInventory Quenx_SoftwareUpdate)
 set_target_properties(${quenx_libraries} PROPERTIES INSTALL_RPATH "$ORIGIN")
 set_target_properties(quenxctl quenx-cimd PROPERTIES INSTALL_RPATH "$ORIGIN/../lib/quenx")
@@ -13,9 +15,10 @@ install(DIRECTORY docs/ DESTINATION share/doc/quenx)
 install(FILES CHANGELOG.md DESTINATION share/doc/quenx)
 install(FILES packaging/adapters.toml packaging/quenx-cimd.toml DESTINATION share/doc/quenx/examples)
 
-# PAM reads /etc alone, whatever the prefix.
-if(CMAKE_INSTALL_PREFIX STREQUAL "/usr")
-    install(DIRECTORY packaging/pam.d DESTINATION /etc)
-else()
-    install(DIRECTORY packaging/pam.d DESTINATION etc)
-endif()
+# Configuration goes below the prefix, for /usr to /etc. With another prefix PAM still reads /etc alone: set this to it.
+set(CMAKE_INSTALL_SYSCONFDIR etc CACHE PATH "Where configuration is installed, relative to the prefix or absolute")
+install(DIRECTORY packaging/pam.d DESTINATION share/doc/quenx/examples)
+install(CODE "set(quenx_sysconfdir \"${CMAKE_INSTALL_SYSCONFDIR}\")
+set(quenx_configuration_source \"${PROJECT_SOURCE_DIR}/packaging\")
+set(quenx_configuration_files pam.d/quenx-cimd)
+include(\"${PROJECT_SOURCE_DIR}/cmake/QuenxInstallConfiguration.cmake\")")

@@ -5,6 +5,7 @@
 #include <unistd.h>
 
 #include <csignal>
+#include <cstring>
 #include <filesystem>
 #include <thread>
 
@@ -283,10 +284,19 @@ TEST(DaemonTest, AsksPamAndTheGroupsOfTheSystem) {
     }
 }
 
+/// Installs the build below a folder, for a prefix, as a package is staged. The component is that of every
+/// file here; named, it leaves the manifest of a real installation alone.
+ProgramResult installBelow(const test::TempFolder& place, const std::string& prefix) {
+    return test::run(
+        {CMAKE, "--install", QUENX_BUILD, "--strip", "--component", "Unspecified", "--prefix", prefix},
+        {"DESTDIR=" + (place / "staged")});
+}
+
 TEST(DaemonTest, RunsWhereItIsInstalled) {
     const test::TempFolder place;
-    const std::string prefix = place / "new/prefix";
-    ASSERT_EQ(test::run({CMAKE, "--install", QUENX_BUILD, "--strip", "--prefix", prefix}).status, 0);
+    const ProgramResult installed = installBelow(place, "/new/prefix");
+    ASSERT_EQ(installed.status, 0) << installed.error;
+    const std::string prefix = place / "staged/new/prefix";
     const std::string config = place.write("config", "[listen]\nhttps = false\nhttp = true\n");
     const ProgramResult checked =
         test::run({prefix + "/sbin/quenx-cimd", "--check-config", "--config", config});
@@ -299,11 +309,25 @@ TEST(DaemonTest, RunsWhereItIsInstalled) {
     }
     // The users file, too, has a directory that is not there yet.
     const std::string users = place / "etc/users";
-    EXPECT_EQ(test::run({"/bin/sh", "-c", "echo x | \"$0\" passwd ann --users " + users,
-                         prefix + "/sbin/quenx-cimd"})
+    EXPECT_EQ(test::run({"/bin/sh", "-c", "echo x | \"$0\" passwd ann --users \"$1\"",
+                         prefix + "/sbin/quenx-cimd", users})
                   .status,
               0);
     EXPECT_TRUE(std::filesystem::exists(users));
+}
+
+TEST(DaemonTest, InstallsConfigurationWhereThereIsNone) {
+    // Only an installation of the distribution's kind configures the machine itself.
+    for (const auto& [prefix, folder] : {std::pair{"/usr", "/etc"}, {"/usr/local", "/usr/local/etc"}}) {
+        const test::TempFolder place;
+        const std::string file = place / ("staged" + std::string(folder) + "/pam.d/quenx-cimd");
+        ASSERT_EQ(installBelow(place, prefix).status, 0) << prefix;
+        EXPECT_EQ(test::readTestFile(file), test::readTestFile(QUENX_PACKAGING_DIR "/pam.d/quenx-cimd"));
+        test::writeTestFile(file, "# the administrator's own\n");
+        const ProgramResult again = installBelow(place, prefix);
+        EXPECT_TRUE(contains(again.out, "Kept: " + file)) << again.out;
+        EXPECT_EQ(test::readTestFile(file).size(), std::strlen("# the administrator's own\n"));
+    }
 }
 
 TEST(DaemonTest, NamesWhatKeepsItFromServing) {
