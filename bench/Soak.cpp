@@ -7,6 +7,7 @@
 #include <string_view>
 
 #include "Reliability/Effort.h"
+#include "Support/Environment.h"
 
 namespace {
 
@@ -30,6 +31,7 @@ int main(int argc, char** argv) {
         return 2;
     }
     test::effort = {true, std::chrono::seconds(seconds), jobs};
+    ::testing::AddGlobalTestEnvironment(new test::ChosenEnvironment);
     const int status = RUN_ALL_TESTS();
     std::printf("\n| figure | number |\n|---|---|\n");
     test::printFigures();

@@ -16,11 +16,19 @@ namespace fs = std::filesystem;
 
 const fs::path kFolder = QUENX_CIM_XML_TEST_DIR;
 
+/// One word of a shell command.
+std::string quoted(std::string word) {
+    for (std::size_t at = word.find('\''); at != word.npos; at = word.find('\'', at + 4))
+        word.replace(at, 1, "'\\''");
+    return "'" + word + "'";
+}
+
 /// The output of `xmllint --dtdvalid`; empty when the message is valid.
 std::string validate(const std::string& message) {
     const TempFolder folder;
-    const std::string command = "xmllint --noout --dtdvalid '" + (kFolder / "cimxml.dtd").string() + "' " +
-                                folder.write("message", message) + " 2>&1; echo $?";
+    // xmllint takes the document type as a URI, which a plain name is wherever its folder may be.
+    const std::string command = "cd " + quoted(kFolder) + " && xmllint --noout --dtdvalid cimxml.dtd " +
+                                quoted(folder.write("message", message)) + " 2>&1; echo $?";
     FILE* pipe = ::popen(command.c_str(), "r");
     if (pipe == nullptr) return "no xmllint";
     std::string output;

@@ -1,5 +1,6 @@
 #include <gtest/gtest.h>
 
+#include "Support/Environment.h"
 #include "Support/SyslogCapture.h"
 
 namespace {
@@ -13,6 +14,7 @@ class LogCleaner : public ::testing::EmptyTestEventListener {
 
 int main(int argc, char** argv) {
     ::testing::InitGoogleTest(&argc, argv);
+    ::testing::AddGlobalTestEnvironment(new test::ChosenEnvironment);
     ::testing::UnitTest::GetInstance()->listeners().Append(new LogCleaner);
     return RUN_ALL_TESTS();
 }

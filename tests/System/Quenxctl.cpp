@@ -1,5 +1,6 @@
 #include "System/Quenxctl.h"
 
+#include <algorithm>
 #include <nlohmann/json.hpp>
 
 namespace test {
@@ -15,6 +16,9 @@ void Quenxctl::describeAdapters(const std::string& fault) {
 
 std::vector<std::string> Quenxctl::command(const std::vector<std::string>& arguments) const {
     std::vector<std::string> all = {QUENXCTL, "--adapters", folder_ / "adapters.toml"};
+    // Never the machine's own.
+    if (std::find(arguments.begin(), arguments.end(), "--config") == arguments.end())
+        all.insert(all.end(), {"--config", configuration_});
     all.insert(all.end(), arguments.begin(), arguments.end());
     return all;
 }

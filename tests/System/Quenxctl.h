@@ -28,6 +28,8 @@ class Quenxctl : public ::testing::Test {
     std::string firmwareOf(const std::string& adapter) const;
 
     TempFolder folder_;
+    /// The providers' settings, where a test does not name others: the defaults.
+    std::string configuration_ = folder_.write("default.conf", "");
     /// For eth0 and eth1: a real one with IMG_PXE 2 and IMG_UEFI 2.
     std::string image_ = folder_.write("new.rom", withRevision(realRom("efi-virtio"), 2));
 };
