@@ -1,9 +1,16 @@
 #!/usr/bin/env bash
 # Installs the packages of the named groups of debian-packages.txt that are missing. Asks nothing.
-# Usage: packaging/install-packages.sh GROUP...
+#
+#   packaging/install-packages.sh GROUP...
+#   packaging/install-packages.sh --check GROUP...    installs nothing; fails when a package is missing
 set -euo pipefail
 
 list="$(dirname "${BASH_SOURCE[0]}")/debian-packages.txt"
+check=false
+if [ "${1:-}" = --check ]; then
+    check=true
+    shift
+fi
 
 wanted() {
     local group package
@@ -16,17 +23,6 @@ is_installed() {
     [ "$(dpkg-query -W -f '${db:Status-Status}' "$1" 2>/dev/null)" = installed ]
 }
 
-as_root() {
-    if [ "$(id -u)" = 0 ]; then
-        "$@"
-    elif command -v sudo >/dev/null; then
-        sudo "$@"
-    else
-        echo "Not root, and there is no sudo. As root, run: $*" >&2
-        return 1
-    fi
-}
-
 missing=()
 while read -r package; do
     is_installed "$package" || missing+=("$package")
@@ -35,10 +31,26 @@ done < <(wanted "$@")
 if [ "${#missing[@]}" = 0 ]; then
     exit 0
 fi
+if [ "$check" = true ]; then
+    exit 1
+fi
 if ! command -v apt-get >/dev/null; then
-    echo "These are missing, and there is no apt-get to install them: ${missing[*]}" >&2
+    echo "These packages are missing, and there is no apt-get to install them: ${missing[*]}" >&2
+    exit 1
+fi
+options=(-y --no-install-recommends)
+if [ "$(id -u)" = 0 ]; then
+    as_root=()
+elif command -v sudo >/dev/null; then
+    as_root=(sudo)
+else
+    {
+        echo "Packages are missing, and installing them takes root. Have an administrator run this, then start again:"
+        echo
+        echo "  apt-get update && apt-get install ${options[*]} ${missing[*]}"
+    } >&2
     exit 1
 fi
 echo "== Installing ${#missing[@]} packages: ${missing[*]}"
-as_root env DEBIAN_FRONTEND=noninteractive apt-get update -q
-as_root env DEBIAN_FRONTEND=noninteractive apt-get install -q -y --no-install-recommends "${missing[@]}"
+"${as_root[@]}" env DEBIAN_FRONTEND=noninteractive apt-get update -q
+"${as_root[@]}" env DEBIAN_FRONTEND=noninteractive apt-get install -q "${options[@]}" "${missing[@]}"
