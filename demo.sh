@@ -1,10 +1,9 @@
 #!/usr/bin/env bash
 # Installs what is missing, builds, and updates the firmware of a simulated Ethernet adapter with a real option-ROM
 # image. Asks nothing, needs root or sudo only for missing packages, and starts afresh each time. All it writes, apart
-# from packages, is in build/demo.
+# from packages, is in build.
 set -euo pipefail
 cd "$(dirname "${BASH_SOURCE[0]}")"
-export LC_ALL=C.UTF-8
 
 say() { printf '\n== %s\n' "$*"; }
 # Prints the command as a person would type it, then runs it.
@@ -14,19 +13,23 @@ show() {
 }
 
 packaging/install-packages.sh build run
+. tools/environment.sh # a proxy was for the packages
 
-say "Building (build/demo)"
-cmake --preset release -B build/demo -DBUILD_TESTING=OFF -DQUENX_BENCH=OFF >/dev/null
-cmake --build build/demo -j "$(nproc)" --target quenxctl quenx-cimd Quenx_SoftwareUpdate Quenx_SoftwareInventory
+# The build is the one that test.sh uses. Without the packages for tests it has none yet.
+say "Building (build/release)"
+untested=()
+packaging/install-packages.sh --check test || untested=(-DBUILD_TESTING=OFF -DQUENX_BENCH=OFF)
+cmake --preset release "${untested[@]}" >/dev/null
+cmake --build --preset release -j "$(nproc)" --target quenxctl quenx-cimd Quenx_SoftwareUpdate Quenx_SoftwareInventory
 
-scratch=build/demo/scratch
+scratch=build/demo
 rm -rf "$scratch"
 mkdir -p "$scratch/firmware"
 cp packaging/adapters.toml "$scratch/adapters.toml"
 cp /usr/lib/ipxe/qemu/efi-virtio.rom /usr/lib/ipxe/qemu/efi-rtl8139.rom "$scratch/firmware/"
 printf 'FWFilePath=%s\n' "$PWD/$scratch/firmware" >"$scratch/provider.conf"
 
-quenxctl=build/demo/bin/quenxctl
+quenxctl=build/release/bin/quenxctl
 options=(--adapters "$scratch/adapters.toml" --config "$scratch/provider.conf")
 
 say "The simulated adapters ($scratch/adapters.toml), and the firmware on them"
@@ -52,7 +55,7 @@ say "An image for another card is refused, with both ids (exit status 1)"
 show "$quenxctl" "${options[@]}" install --target eth0 "$scratch/firmware/efi-rtl8139.rom" || true
 
 say "The embedded object manager, on a free port, with a user of its own"
-daemon=build/demo/bin/quenx-cimd
+daemon=build/release/bin/quenx-cimd
 cat >"$scratch/quenx-cimd.toml" <<EOF
 [listen]
 https_port = 0
