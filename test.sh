@@ -2,25 +2,26 @@
 # Installs what is missing, builds, and runs all tests.
 #
 #   ./test.sh                 the default build and the one with the address and undefined-behaviour sanitizers
-#   ./test.sh --ci            these, 32-bit x86, the thread sanitizer, and 10 s of each fuzz target
-#   ./test.sh PRESET...       just these: release asan tsan x86-32 clang, and fuzz, whose targets the build asan has
+#   ./test.sh --ci            these, 32-bit x86, the thread sanitizer, 10 s of each fuzz target, and elsewhere
+#   ./test.sh PRESET...       just these: release asan tsan x86-32 clang; fuzz, whose targets the build asan has; and
+#                             elsewhere, the demo and the release tests as another user in an odd folder
 #
 # CI=true in the environment means --ci. JOBS=N sets how many jobs run at once (default: one for each processor).
 set -euo pipefail
 cd "$(dirname "${BASH_SOURCE[0]}")"
-export LC_ALL=C.UTF-8
 
 jobs="${JOBS:-$(nproc)}"
 fuzz_seconds="${FUZZ_SECONDS:-10}"
 groups=(build run test)
 fuzz_build=build/asan
+all_presets=(release asan x86-32 tsan fuzz elsewhere clang)
 presets=()
 
 for argument in "$@"; do
     case "$argument" in
         --ci) CI=true ;;
         -h | --help)
-            sed -n '2,9s/^# \{0,1\}//p' "$0"
+            sed -n '2,10s/^# \{0,1\}//p' "$0"
             exit 0
             ;;
         -*)
@@ -32,11 +33,12 @@ for argument in "$@"; do
 done
 if [ "${#presets[@]}" = 0 ]; then
     presets=(release asan)
-    [ "${CI:-}" = true ] && presets+=(x86-32 tsan fuzz)
+    [ "${CI:-}" = true ] && presets+=(x86-32 tsan fuzz elsewhere)
 fi
 case " ${presets[*]} " in *" x86-32 "*) groups+=(x86-32) ;; esac
 
 packaging/install-packages.sh "${groups[@]}"
+. tools/environment.sh # a proxy was for the packages
 export ASAN_OPTIONS="${ASAN_OPTIONS:-detect_stack_use_after_return=1}"
 export UBSAN_OPTIONS="${UBSAN_OPTIONS:-print_stacktrace=1}"
 export TSAN_OPTIONS="${TSAN_OPTIONS:-halt_on_error=1 second_deadlock_stack=1}"
@@ -60,6 +62,11 @@ tsan_prefix() {
     rm -rf "$probe"
 }
 
+# For root, whom the system stops from nothing: tests can write to the build and to a /tmp of their own.
+contained=()
+mkdir -p build
+if tools/contained.sh . -- true 2>/dev/null; then contained=(tools/contained.sh build --); fi
+
 run_tests() {
     local preset="$1" prefix=env
     if [ "$preset" = tsan ]; then prefix="$(tsan_prefix)"; fi
@@ -68,7 +75,7 @@ run_tests() {
     # Building runs the test programs too, to list their tests.
     $prefix cmake --build --preset "$preset" -j "$jobs"
     echo "== $preset: testing"
-    $prefix ctest --preset "$preset" -j "$jobs" --output-on-failure --no-tests=error
+    $prefix "${contained[@]}" ctest --preset "$preset" -j "$jobs"
 }
 
 # Each target starts from its seeds; what it finds on its way stays in the build folder.
@@ -97,7 +104,36 @@ run_fuzzers() {
     fi
 }
 
+# The tests of a run that were skipped, each with the reason that it gave.
+skipped_tests() {
+    local log="build/$1/Testing/Temporary/LastTest.log"
+    [ ! -f "$log" ] || awk -v preset="$1" '
+        /: Skipped$/ { getline reason }
+        /^\[  SKIPPED \] .* \([0-9]+ ms\)$/ { printf "  %s: %s: %s\n", preset, $4, reason }' "$log"
+}
+
+what_was_skipped() {
+    local preset skipped= unasked=()
+    for preset in "${presets[@]}"; do
+        [ "$preset" = fuzz ] || skipped+="$(skipped_tests "$preset")"$'\n'
+    done
+    skipped="$(grep . <<<"$skipped" || true)"
+    echo "== Skipped:${skipped:+$'\n'}${skipped:- no test}"
+    if [ "${#contained[@]}" = 0 ]; then
+        echo "== Not shown: that no test writes outside its own folders, which takes root and mount namespaces"
+    fi
+    for preset in "${all_presets[@]}"; do
+        case " ${presets[*]} " in *" $preset "*) ;; *) unasked+=("$preset") ;; esac
+    done
+    [ "${#unasked[@]}" = 0 ] || echo "== Not run, since not asked for (see --help): ${unasked[*]}"
+}
+
 for preset in "${presets[@]}"; do
-    if [ "$preset" = fuzz ]; then run_fuzzers; else run_tests "$preset"; fi
+    case "$preset" in
+        fuzz) run_fuzzers ;;
+        elsewhere) tests/elsewhere.sh ;;
+        *) run_tests "$preset" ;;
+    esac
 done
+what_was_skipped
 echo "== All passed: ${presets[*]}"
