@@ -3,7 +3,8 @@
 # Fails when less than 95 % of its lines are reached. Needs gcovr.
 set -euo pipefail
 cd "$(dirname "${BASH_SOURCE[0]}")/.."
-export LC_ALL=C.UTF-8
+tools/need.sh gcovr
+. tools/environment.sh
 
 build=build/coverage
 programs=(UtilsTest SoftwareUpdateTest ReliabilityTest UnloadTest)
