@@ -7,6 +7,7 @@
 
 #include "CimXml/WireError.h"
 #include "CimXml/XmlText.h"
+#include "Utils/Utils.h"
 
 namespace cimxml {
 
@@ -19,12 +20,11 @@ bool isBlank(char byte) {
 }
 
 bool isNameStart(char byte) {
-    return (byte >= 'a' && byte <= 'z') || (byte >= 'A' && byte <= 'Z') || byte == '_' || byte == ':' ||
-           static_cast<unsigned char>(byte) >= 0x80;
+    return utils::isLetter(byte) || byte == '_' || byte == ':' || static_cast<unsigned char>(byte) >= 0x80;
 }
 
 bool isNamePart(char byte) {
-    return isNameStart(byte) || (byte >= '0' && byte <= '9') || byte == '-' || byte == '.';
+    return isNameStart(byte) || utils::isDigit(byte) || byte == '-' || byte == '.';
 }
 
 struct Attribute {
@@ -33,9 +33,7 @@ struct Attribute {
 };
 
 bool isUtf8Name(std::string_view encoding) {
-    std::string folded(encoding);
-    std::transform(folded.begin(), folded.end(), folded.begin(),
-                   [](char c) { return c >= 'A' && c <= 'Z' ? static_cast<char>(c - 'A' + 'a') : c; });
+    const std::string folded = utils::lowerCase(encoding);
     return folded == "utf-8" || folded == "utf8" || folded == "us-ascii";
 }
 

@@ -50,10 +50,6 @@ std::int32_t levelFromEnvironment() noexcept {
     return 1;
 }
 
-bool isControl(char c) {
-    return static_cast<unsigned char>(c) < 0x20 || c == 0x7F;
-}
-
 /// The line is handed to syslog as its format. Only the conversions that need no argument may stay, and no
 /// control character may forge a second line.
 std::string escapeForSyslog(const std::string& line) {
@@ -62,7 +58,7 @@ std::string escapeForSyslog(const std::string& line) {
     for (std::size_t i = 0; i < line.size(); ++i) {
         const char c = line[i];
         if (isControl(c)) {
-            format += formatStr("#%03o", static_cast<unsigned>(c));
+            format += formatStr("#%03o", static_cast<unsigned int>(c));
         } else if (c != '%') {
             format += c;
         } else if (i + 1 < line.size() && (line[i + 1] == '%' || line[i + 1] == 'm')) {

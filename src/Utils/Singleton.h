@@ -36,8 +36,8 @@ class QUENX_EXPORT Singleton {
 
   private:
     static std::atomic<Singleton*> currentInstance;
-    static std::mutex registryMutex;
-    static Singleton* newestAlive;
+    static std::mutex m_registryMutex;
+    static Singleton* m_newestAlive;
 
     Singleton* m_previous = nullptr;
     Singleton* m_olderAlive = nullptr;
@@ -52,28 +52,28 @@ class QUENX_EXPORT AutoSingleton : protected Singleton<T> {
     static T* getInstance();
 
   private:
-    static std::mutex creationMutex;
-    static std::unique_ptr<T> createdInstance;
+    static std::mutex m_creationMutex;
+    static std::unique_ptr<T> m_createdInstance;
 };
 
 template <typename T>
 std::atomic<Singleton<T>*> Singleton<T>::currentInstance{nullptr};
 template <typename T>
-std::mutex Singleton<T>::registryMutex;
+std::mutex Singleton<T>::m_registryMutex;
 template <typename T>
-Singleton<T>* Singleton<T>::newestAlive = nullptr;
+Singleton<T>* Singleton<T>::m_newestAlive = nullptr;
 template <typename T>
-std::mutex AutoSingleton<T>::creationMutex;
+std::mutex AutoSingleton<T>::m_creationMutex;
 template <typename T>
-std::unique_ptr<T> AutoSingleton<T>::createdInstance;
+std::unique_ptr<T> AutoSingleton<T>::m_createdInstance;
 
 template <typename T>
 Singleton<T>::Singleton() {
     {
-        std::lock_guard<std::mutex> lock(registryMutex);
+        std::lock_guard<std::mutex> lock(m_registryMutex);
         m_previous = currentInstance.load();
-        m_olderAlive = newestAlive;
-        newestAlive = this;
+        m_olderAlive = m_newestAlive;
+        m_newestAlive = this;
         currentInstance.store(this);
     }
     QUENX_DEBUG("New singleton instance for %s", T::GetSingletonName());
@@ -81,11 +81,11 @@ Singleton<T>::Singleton() {
 
 template <typename T>
 Singleton<T>::~Singleton() {
-    std::lock_guard<std::mutex> lock(registryMutex);
+    std::lock_guard<std::mutex> lock(m_registryMutex);
     // Intended: the remembered one becomes current without a look at whether this one was.
     currentInstance.store(m_previous);
     // Instances that are destroyed out of order must not bring this one back.
-    Singleton** link = &newestAlive;
+    Singleton** link = &m_newestAlive;
     while (*link != nullptr) {
         if (*link == this) {
             *link = m_olderAlive;
@@ -116,11 +116,11 @@ T* Singleton<T>::getInstance() {
 template <typename T>
 T* AutoSingleton<T>::getInstance() {
     // Always under the lock: an instance is current before its constructor has ended.
-    std::lock_guard<std::mutex> lock(creationMutex);
+    std::lock_guard<std::mutex> lock(m_creationMutex);
     if (T* const instance = Singleton<T>::findInstance()) return instance;
     // One that destruction out of order has hidden still serves: callers may hold it.
-    if (createdInstance == nullptr) createdInstance = T::CreateSingleton();
-    return createdInstance.get();
+    if (m_createdInstance == nullptr) m_createdInstance = T::CreateSingleton();
+    return m_createdInstance.get();
 }
 
 }  // namespace utils

@@ -9,7 +9,7 @@ namespace utils {
 
 namespace {
 
-constexpr std::uint64_t microsecondsPerSecond = 1000000;
+constexpr std::uint64_t kMicrosecondsPerSecond = 1000000;
 
 int daysOfMonth(int year, int month) {
     if (month == 2) return Time::isLeapYear(static_cast<unsigned short>(year)) ? 29 : 28;
@@ -50,7 +50,7 @@ Time::Time(int year, int month, int day, int hour, int minute, int second) : m_i
     // Intended: the last second of 1969 cannot be told from a failure.
     if (seconds == -1) throw Exception("wrong time value");
     // Modulo 2^64 before 1970.
-    m_value = static_cast<std::uint64_t>(seconds) * microsecondsPerSecond;
+    m_value = static_cast<std::uint64_t>(seconds) * kMicrosecondsPerSecond;
 }
 
 void Time::resetTimer() {
@@ -65,7 +65,7 @@ void Time::setInterval(const Time& start) {
 }
 
 Time Time::setIntervalInSeconds(unsigned int seconds) {
-    m_value = seconds * microsecondsPerSecond;
+    m_value = seconds * kMicrosecondsPerSecond;
     m_isTimestamp = false;
     return *this;
 }

@@ -16,15 +16,6 @@ namespace {
 constexpr std::array<std::string_view, 9> uriSchemaName = {"",     "",      "data", "file", "ftp",
                                                            "http", "https", "nfs",  "tftp"};
 
-char upperCase(char c) {
-    return c >= 'a' && c <= 'z' ? static_cast<char>(c - 'a' + 'A') : c;
-}
-
-bool equalsIgnoringCase(std::string_view left, std::string_view right) {
-    return std::equal(left.begin(), left.end(), right.begin(), right.end(),
-                      [](char a, char b) { return upperCase(a) == upperCase(b); });
-}
-
 Uri::SupportedURISchemes findScheme(const std::string& word, const std::string& rest) {
     if (word.empty() || rest.compare(0, 2, "//") != 0) return Uri::SupportedURISchemes::Unknown;
     for (std::size_t i = 0; i < uriSchemaName.size(); ++i) {

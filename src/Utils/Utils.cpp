@@ -12,12 +12,12 @@
 namespace utils {
 
 std::string vformatStr(const char* format, va_list arguments) {
-    constexpr std::size_t longest = 511;
-    char buffer[longest + 1] = {};
+    constexpr std::size_t kLongest = 511;
+    char buffer[kLongest + 1] = {};
     const int length = vsnprintf(buffer, sizeof buffer, format, arguments);
     // Also for a negative result: the text is then the whole buffer, as log readers know it.
-    const bool isCut = static_cast<unsigned>(length) > longest;
-    return std::string(buffer, isCut ? longest : static_cast<std::size_t>(length));
+    const bool isCut = static_cast<unsigned int>(length) > kLongest;
+    return std::string(buffer, isCut ? kLongest : static_cast<std::size_t>(length));
 }
 
 std::string formatStr(const char* format, ...) {
@@ -68,6 +68,27 @@ bool toUint(std::string_view text, std::uint32_t& value) {
     if (!isHex && (number > INT32_MAX || (text.size() > 1 && text[0] == '0'))) return false;
     value = number;
     return true;
+}
+
+std::string lowerCase(std::string_view text) {
+    std::string folded(text);
+    for (char& c : folded)
+        c = lowerCase(c);
+    return folded;
+}
+
+std::string hexByte(unsigned char byte) {
+    constexpr std::string_view kDigits = "0123456789abcdef";
+    return {kDigits[byte >> 4], kDigits[byte & 0xF]};
+}
+
+std::string quoted(std::string_view text) {
+    std::string result = "\"";
+    for (const char c : text) {
+        if (c == '"' || c == '\\') result += '\\';
+        result += c;
+    }
+    return result + '"';
 }
 
 void replaceCharacter(std::string& text, char from, char to) {

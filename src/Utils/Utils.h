@@ -1,5 +1,6 @@
 #pragma once
 
+#include <algorithm>
 #include <cstdint>
 #include <string>
 #include <string_view>
@@ -31,6 +32,36 @@ QUENX_EXPORT std::string_view trimOf(std::string_view text, std::string_view cha
 /// case; blanks around it are ignored. A text that the number would not print back as is refused: a sign,
 /// leading zeros of a decimal number, anything after it. False, and `value` untouched, when refused.
 QUENX_EXPORT bool toUint(std::string_view text, std::uint32_t& value);
+
+/// Folds the letters of ASCII to one case, and no others: names of the protocols and of CIM are compared so
+/// in every locale.
+constexpr char lowerCase(char c) {
+    return c >= 'A' && c <= 'Z' ? static_cast<char>(c - 'A' + 'a') : c;
+}
+QUENX_EXPORT std::string lowerCase(std::string_view text);
+constexpr bool equalsIgnoringCase(std::string_view left, std::string_view right) {
+    return std::equal(left.begin(), left.end(), right.begin(), right.end(),
+                      [](char a, char b) { return lowerCase(a) == lowerCase(b); });
+}
+
+/// The letters and the digits of ASCII, whatever the locale.
+constexpr bool isLetter(char c) {
+    return lowerCase(c) >= 'a' && lowerCase(c) <= 'z';
+}
+constexpr bool isDigit(char c) {
+    return c >= '0' && c <= '9';
+}
+
+/// A control character of ASCII, which would forge lines in a log and colours on a terminal.
+constexpr bool isControl(char c) {
+    return static_cast<unsigned char>(c) < 0x20 || c == 0x7F;
+}
+
+/// The byte as two hexadecimal digits in lower case.
+QUENX_EXPORT std::string hexByte(unsigned char byte);
+
+/// The text between double quotes, with a backslash before each quote and backslash in it.
+QUENX_EXPORT std::string quoted(std::string_view text);
 
 /// Replaces every `from` by `to`, in place.
 QUENX_EXPORT void replaceCharacter(std::string& text, char from, char to);

@@ -27,7 +27,7 @@ struct SafeListTest : ::testing::Test {
 
 }  // namespace
 
-TEST_F(SafeListTest, AnIteratorMeetsWhatIsAddedAndOutlivesAClear) {
+TEST_F(SafeListTest, IteratesOverWhatIsAddedAndAcrossAClear) {
     List::Iterator iterator = list.getElements();
     EXPECT_EQ(iterator.first(), nullptr);
     list.add(&one);
@@ -46,7 +46,7 @@ TEST_F(SafeListTest, AnIteratorMeetsWhatIsAddedAndOutlivesAClear) {
     EXPECT_EQ(iterator.first(), &two);
 }
 
-TEST_F(SafeListTest, CopyingAnIteratorTransfersIt) {
+TEST_F(SafeListTest, TransfersAnIteratorThatIsCopied) {
     const test::LogLevelGuard guard(1);
     list.add(&one);
     list.add(&two);
@@ -69,7 +69,7 @@ TEST_F(SafeListTest, CopyingAnIteratorTransfersIt) {
     EXPECT_THROW(copy.first(), utils::Exception);
 }
 
-TEST_F(SafeListTest, AnOwningListDeletesFrontToBackAndSkipsNull) {
+TEST_F(SafeListTest, DeletesFrontToBackAndSkipsNullWhenOwning) {
     {
         List owning(true);
         for (int id : {1, 2})
@@ -82,7 +82,7 @@ TEST_F(SafeListTest, AnOwningListDeletesFrontToBackAndSkipsNull) {
     EXPECT_EQ(deleted, (std::vector<int>{1, 2, 3}));
 }
 
-TEST_F(SafeListTest, ManyThreadsAddWalkAndClear) {
+TEST_F(SafeListTest, LetsManyThreadsAddWalkAndClear) {
     std::vector<std::thread> threads;
     for (int i = 0; i < 4; ++i) {
         threads.emplace_back([&] {

@@ -8,7 +8,7 @@ using test::LogLevelGuard;
 using test::SyslogCapture;
 using utils::Exception;
 
-TEST(Exception, OnlyTheOneFromATextIsPrefixedAndBothLogTheBareText) {
+TEST(ExceptionTest, PrefixesOnlyATextAndLogsItBare) {
     const LogLevelGuard guard(1);
     EXPECT_STREQ(Exception("wrong value %d", 7).what(), "wrong value 7");
     EXPECT_STREQ(Exception(std::string("a%n%s")).what(), "SMASHv2:a%n%s");

@@ -27,7 +27,7 @@ std::string firstLine() {
 
 }  // namespace
 
-TEST(Log, LevelComesFromTheFirstCharacterOfTheVariable) {
+TEST(LogTest, TakesItsLevelFromTheFirstCharacterOfTheVariable) {
     const LogLevelGuard guard(-1);
     const struct {
         const char* value;
@@ -50,7 +50,7 @@ TEST(Log, LevelComesFromTheFirstCharacterOfTheVariable) {
     unsetenv(levelVariable);
 }
 
-TEST(Log, FirstLinesOfManyThreadsOpenItOnce) {
+TEST(LogTest, OpensOnceForTheFirstLinesOfManyThreads) {
     const LogLevelGuard guard(-1);
     std::vector<std::thread> threads;
     for (int i = 0; i < 8; ++i)
@@ -61,7 +61,7 @@ TEST(Log, FirstLinesOfManyThreadsOpenItOnce) {
     EXPECT_EQ(SyslogCapture::count("[error]"), 8U);
 }
 
-TEST(Log, NothingInAMessageIsInterpretedThatNeedsAnArgument) {
+TEST(LogTest, InterpretsNothingInAMessageThatNeedsAnArgument) {
     const LogLevelGuard guard(2);
     // A line whose cut at 511 characters falls behind the first of two percent signs.
     const std::string cut(511 - std::strlen("[debug] \"") - 1, 'x');
@@ -84,7 +84,7 @@ TEST(Log, NothingInAMessageIsInterpretedThatNeedsAnArgument) {
     }
 }
 
-TEST(Log, ErrorsCarryABacktraceWithSymbolsFromLevelTwo) {
+TEST(LogTest, AddsABacktraceToErrorsWithSymbolsFromLevelTwo) {
     for (const int level : {1, 2}) {
         const LogLevelGuard guard(level);
         SyslogCapture::clear();
@@ -100,7 +100,7 @@ TEST(Log, ErrorsCarryABacktraceWithSymbolsFromLevelTwo) {
     EXPECT_TRUE(SyslogCapture::lines().empty());
 }
 
-TEST(Log, MacrosEvaluateOnlyWhatIsWrittenAndLetNothingOut) {
+TEST(LogTest, EvaluatesOnlyWhatIsWrittenAndLetsNothingOut) {
     int evaluated = 0;
     const auto count = [&] { return ++evaluated; };
     const auto fail = []() -> int { throw std::runtime_error("argument"); };
@@ -120,7 +120,7 @@ TEST(Log, MacrosEvaluateOnlyWhatIsWrittenAndLetNothingOut) {
     EXPECT_EQ(SyslogCapture::messages(), (std::vector<std::string>{"50%", "%d"}));
 }
 
-TEST(Log, VpddbgIsFoundByItsPlainNameAndDropsNewlines) {
+TEST(LogTest, OffersVpddbgByItsPlainNameWhichDropsNewlines) {
     const LogLevelGuard guard(2);
     const auto entry = reinterpret_cast<void (*)(const char*, ...)>(dlsym(RTLD_DEFAULT, "vpddbg"));
     ASSERT_NE(entry, nullptr);

@@ -33,7 +33,7 @@ struct Slow : utils::AutoSingleton<Slow> {
 
 }  // namespace
 
-TEST(Singleton, DestructionOutOfOrderNeverBringsBackADeadInstance) {
+TEST(SingletonTest, NeverBringsBackADeadInstanceAfterDestructionOutOfOrder) {
     const test::LogLevelGuard guard(2);
     std::optional<Plain> first(std::in_place);
     std::optional<Plain> second(std::in_place);
@@ -50,7 +50,7 @@ TEST(Singleton, DestructionOutOfOrderNeverBringsBackADeadInstance) {
     EXPECT_THROW(Plain::getInstance(), utils::Exception);
 }
 
-TEST(AutoSingleton, TwoFirstCallsMakeOneWholeInstanceThatANewerOneHides) {
+TEST(AutoSingletonTest, MakesOneWholeInstanceOnTwoFirstCallsThatANewerOneHides) {
     std::vector<std::thread> threads;
     for (int i = 0; i < 8; ++i) {
         threads.emplace_back([] { EXPECT_TRUE(Slow::getInstance()->isWhole); });
@@ -66,7 +66,7 @@ TEST(AutoSingleton, TwoFirstCallsMakeOneWholeInstanceThatANewerOneHides) {
     EXPECT_EQ(Slow::getInstance(), created);
 }
 
-TEST(OSLocker, AMissingLockerFailsTheBeginningButNotTheEndOfAScope) {
+TEST(OSLockerTest, FailsTheBeginningButNotTheEndOfAScopeWhenMissing) {
     const test::LogLevelGuard guard(1);
     EXPECT_THROW(const OSLocker::AutoOSLocker scope, utils::Exception);
     {

@@ -37,7 +37,7 @@ std::string failureOf(const Fields& f) {
 
 }  // namespace
 
-TEST(Time, CalendarFieldsAreUtcInEveryZone) {
+TEST(TimeTest, TakesCalendarFieldsAsUtcInEveryZone) {
     const struct {
         Fields fields;
         std::uint64_t seconds;
@@ -65,7 +65,7 @@ TEST(Time, CalendarFieldsAreUtcInEveryZone) {
     tzset();
 }
 
-TEST(Time, FieldsAreCheckedInOrder) {
+TEST(TimeTest, ChecksFieldsInOrder) {
     const struct {
         Fields fields;
         const char* failure;
@@ -85,7 +85,7 @@ TEST(Time, FieldsAreCheckedInOrder) {
         EXPECT_EQ(failureOf(row.fields), row.failure);
 }
 
-TEST(Time, IntervalsDecodeToDaysAndTheirParts) {
+TEST(TimeTest, DecodesIntervalsToDaysAndTheirParts) {
     Time time(5ULL);
     EXPECT_EQ(decode(time.setIntervalInSeconds(90061)), (Fields{0, 0, 1, 1, 1, 1}));
     time.setIntervalInMinutes(71582789);  // 44 s above 2^32
@@ -102,7 +102,7 @@ TEST(Time, IntervalsDecodeToDaysAndTheirParts) {
     EXPECT_TRUE(stamp - Time(1000006ULL) == Time(~0ULL));
 }
 
-TEST(Time, ElapsedTimeCountsFromATimestampOnly) {
+TEST(TimeTest, CountsElapsedTimeFromATimestampOnly) {
     const Time before;
     EXPECT_FALSE(before.isPeriod());
     Time elapsed;

@@ -8,7 +8,7 @@ using utils::Uri;
 using Scheme = Uri::SupportedURISchemes;
 using Lines = std::vector<std::string>;
 
-TEST(Uri, TextsGiveSchemePathAndLogLine) {
+TEST(UriTest, GivesSchemePathAndLogLine) {
     const test::LogLevelGuard guard(2);
     const struct {
         const char* text;

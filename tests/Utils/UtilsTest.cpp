@@ -2,14 +2,26 @@
 
 #include <gtest/gtest.h>
 
-TEST(Utils, FormatsAreCutAt511) {
+TEST(UtilsTest, CutsFormatsAt511) {
     EXPECT_EQ(fmt("%s", std::string(511, 'a').c_str()).size(), 511U);
     EXPECT_EQ(fmt("%s", std::string(512, 'a').c_str()), std::string(511, 'a'));
     // A failure of the C library counts as a text that is too long.
     EXPECT_EQ(utils::formatStr("a%ls", L"\xD800").size(), 511U);
 }
 
-TEST(Utils, SplittingKeepsEmptyPieces) {
+TEST(UtilsTest, FoldsLettersOfAsciiOnly) {
+    EXPECT_EQ(utils::lowerCase("AZ[\xC3\x84@az"), "az[\xC3\x84@az");
+    EXPECT_TRUE(utils::equalsIgnoringCase("Quenx_Z", "qUENX_z"));
+    EXPECT_FALSE(utils::equalsIgnoringCase("a", "ab"));
+    EXPECT_FALSE(utils::equalsIgnoringCase("[", "{"));
+}
+
+TEST(UtilsTest, WritesBytesAndQuotesThatReadersTakeBack) {
+    EXPECT_EQ(utils::hexByte(0xF0) + utils::hexByte(0x0A), "f00a");
+    EXPECT_EQ(utils::quoted("a\"\\"), "\"a\\\"\\\\\"");
+}
+
+TEST(UtilsTest, KeepsEmptyPiecesWhenSplitting) {
     using utils::split;
     EXPECT_EQ(split("::a:", ':'), (utils::StringArray{"", "", "a", ""}));
     EXPECT_EQ(split("", ':'), (utils::StringArray{""}));

@@ -5,6 +5,7 @@
 #include <cstdio>
 
 #include "Framework/Model/CimValue.h"
+#include "Utils/Utils.h"
 
 namespace core {
 
@@ -17,8 +18,7 @@ constexpr unsigned long long kMicrosecondsPerSecond = 1000000;
 /// The digits at a place of the text as a number; nothing when one is no digit.
 std::optional<int> digits(std::string_view text, std::size_t place, std::size_t count) {
     const std::string_view field = text.substr(place, count);
-    if (!std::all_of(field.begin(), field.end(), [](char c) { return c >= '0' && c <= '9'; }))
-        return std::nullopt;
+    if (!std::all_of(field.begin(), field.end(), utils::isDigit)) return std::nullopt;
     int value = 0;
     std::from_chars(field.data(), field.data() + field.size(), value);
     return value;

@@ -5,17 +5,18 @@
 
 #include "Framework/Model/CimInstance.h"
 #include "Framework/Model/CimValue.h"
+#include "Utils/Utils.h"
 
 namespace core {
 
 namespace {
 
 bool isNameStart(char c) {
-    return (c >= 'a' && c <= 'z') || (c >= 'A' && c <= 'Z') || c == '_';
+    return utils::isLetter(c) || c == '_';
 }
 
 bool isNameCharacter(char c) {
-    return isNameStart(c) || (c >= '0' && c <= '9') || (c & 0x80) != 0;
+    return isNameStart(c) || utils::isDigit(c) || (c & 0x80) != 0;
 }
 
 bool isName(std::string_view text) {
@@ -28,19 +29,10 @@ bool isQuotedType(const CimScalar& value) {
            std::holds_alternative<utils::Time>(value);
 }
 
-std::string quoted(std::string_view text) {
-    std::string result = "\"";
-    for (const char c : text) {
-        if (c == '"' || c == '\\') result += '\\';
-        result += c;
-    }
-    return result + '"';
-}
-
 std::string keyText(const CimScalar& value) {
     // The type is only looked at for how a number was declared, which its variant tells as well.
     const std::string text = scalarText(CimType::String, value);
-    return isQuotedType(value) ? quoted(text) : text;
+    return isQuotedType(value) ? utils::quoted(text) : text;
 }
 
 /// Reads the list of keys behind the class name.

@@ -1,7 +1,8 @@
 #include "Framework/Model/CimType.h"
 
-#include <algorithm>
 #include <array>
+
+#include "Utils/Utils.h"
 
 namespace core {
 
@@ -10,10 +11,6 @@ namespace {
 constexpr std::array<std::string_view, 15> kTypeNames = {
     "boolean", "string", "char16", "uint8",  "uint16", "uint32",   "uint64",   "sint8",
     "sint16",  "sint32", "sint64", "real32", "real64", "datetime", "reference"};
-
-constexpr char fold(char c) {
-    return c >= 'A' && c <= 'Z' ? static_cast<char>(c - 'A' + 'a') : c;
-}
 
 }  // namespace
 
@@ -41,14 +38,11 @@ bool isReal(CimType type) {
 }
 
 bool sameName(std::string_view left, std::string_view right) {
-    return std::equal(left.begin(), left.end(), right.begin(), right.end(),
-                      [](char a, char b) { return fold(a) == fold(b); });
+    return utils::equalsIgnoringCase(left, right);
 }
 
 std::string foldName(std::string_view name) {
-    std::string folded(name);
-    std::transform(folded.begin(), folded.end(), folded.begin(), fold);
-    return folded;
+    return utils::lowerCase(name);
 }
 
 }  // namespace core

@@ -6,6 +6,7 @@
 #include <array>
 
 #include "Framework/Model/CimError.h"
+#include "Utils/Utils.h"
 
 namespace host {
 
@@ -24,11 +25,8 @@ std::string newContext() {
         throw CimError(CimStatus::Failed, "no random numbers for an enumeration context");
     }
     std::string text;
-    for (const unsigned char byte : bytes) {
-        constexpr char kDigits[] = "0123456789abcdef";
-        text += kDigits[byte >> 4];
-        text += kDigits[byte & 15];
-    }
+    for (const unsigned char byte : bytes)
+        text += utils::hexByte(byte);
     return text;
 }
 

@@ -15,30 +15,30 @@ namespace os {
 class EchoOff {
   public:
     EchoOff() {
-        if (tcgetattr(STDIN_FILENO, &s_saved) != 0) return;
+        if (tcgetattr(STDIN_FILENO, &m_saved) != 0) return;
         m_isTerminal = true;
-        for (std::size_t i = 0; i < SIGNALS.size(); ++i)
-            replace(SIGNALS[i], m_actions[i]);
-        termios silent = s_saved;
+        for (std::size_t i = 0; i < kSignals.size(); ++i)
+            replace(kSignals[i], m_actions[i]);
+        termios silent = m_saved;
         silent.c_lflag &= ~static_cast<tcflag_t>(ECHO);
         silent.c_lflag |= NOFLSH;  // Ctrl-Z does not drop half a password either
         tcsetattr(STDIN_FILENO, TCSAFLUSH, &silent);
     }
     ~EchoOff() {
         if (!m_isTerminal) return;
-        tcsetattr(STDIN_FILENO, TCSADRAIN, &s_saved);
-        for (std::size_t i = 0; i < SIGNALS.size(); ++i)
-            sigaction(SIGNALS[i], &m_actions[i], nullptr);
+        tcsetattr(STDIN_FILENO, TCSADRAIN, &m_saved);
+        for (std::size_t i = 0; i < kSignals.size(); ++i)
+            sigaction(kSignals[i], &m_actions[i], nullptr);
     }
     EchoOff(const EchoOff&) = delete;
     EchoOff& operator=(const EchoOff&) = delete;
 
   private:
-    static constexpr std::array<int, 5> SIGNALS = {SIGINT, SIGTERM, SIGHUP, SIGQUIT, SIGTSTP};
+    static constexpr std::array<int, 5> kSignals = {SIGINT, SIGTERM, SIGHUP, SIGQUIT, SIGTSTP};
 
     /// What was typed of a password is not left to the program that reads next.
     static void restoreAndEnd(int number) {
-        tcsetattr(STDIN_FILENO, TCSAFLUSH, &s_saved);
+        tcsetattr(STDIN_FILENO, TCSAFLUSH, &m_saved);
         (void)signal(number, SIG_DFL);
         (void)raise(number);
     }
@@ -51,8 +51,8 @@ class EchoOff {
         if (before.sa_handler != SIG_IGN) sigaction(number, &action, nullptr);
     }
 
-    static inline termios s_saved{};  ///< where a signal handler finds it
-    std::array<struct sigaction, SIGNALS.size()> m_actions{};
+    static inline termios m_saved{};  ///< where a signal handler finds it
+    std::array<struct sigaction, kSignals.size()> m_actions{};
     bool m_isTerminal = false;
 };
 

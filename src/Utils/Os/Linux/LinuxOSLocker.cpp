@@ -8,8 +8,8 @@ namespace os {
 
 namespace {
 
-constexpr int taken = 0;
-constexpr int busy = 2;
+constexpr int kTaken = 0;
+constexpr int kBusy = 2;
 
 }  // namespace
 
@@ -35,7 +35,7 @@ OSLockerLinux::OSLockerLinux() = default;
 OSLockerLinux::~OSLockerLinux() = default;
 
 int OSLockerLinux::Lock() {
-    return m_busy.exchange(true) ? busy : taken;
+    return m_busy.exchange(true) ? kBusy : kTaken;
 }
 
 int OSLockerLinux::UnLock() {

@@ -26,11 +26,11 @@ template class AutoSingleton<SMASHv2Config>;
 
 namespace {
 
-constexpr const char* configurationFile = "/etc/quenx-cimprovider.conf";
-constexpr const char* releaseClaimKey = "ReleaseClaimAfterCheck";
-constexpr std::string_view rootNamespace = "root";
+constexpr const char* kConfigurationFile = "/etc/quenx-cimprovider.conf";
+constexpr const char* kReleaseClaimKey = "ReleaseClaimAfterCheck";
+constexpr std::string_view kRootNamespace = "root";
 // The lines of a reading pass name the operation as a whole.
-constexpr const char* readingFunction = "initialize";
+constexpr const char* kReadingFunction = "initialize";
 
 bool isSkipped(const std::string& line) {
     const std::size_t begin = line.find_first_not_of(" \t");
@@ -43,7 +43,7 @@ void addDirectories(const std::string& list, StringArray& directories) {
         std::string path(trimOf(item, " "));
         if (!path.empty() && path.back() == '/') path.pop_back();
         if (!os::isThisADir(path)) continue;
-        formatDebugLog(__FILE__, readingFunction, __LINE__, "Adding path-> %s", path.c_str());
+        formatDebugLog(__FILE__, kReadingFunction, __LINE__, "Adding path-> %s", path.c_str());
         directories.push_back(std::move(path));
     }
 }
@@ -56,7 +56,7 @@ SMASHv2Config::SMASHv2Config(std::string path)
 SMASHv2Config::~SMASHv2Config() = default;
 
 std::unique_ptr<SMASHv2Config> SMASHv2Config::CreateSingleton() {
-    return std::make_unique<SMASHv2Config>(configurationFile);
+    return std::make_unique<SMASHv2Config>(kConfigurationFile);
 }
 
 std::string SMASHv2Config::getNamespace() {
@@ -119,7 +119,7 @@ void SMASHv2Config::readLine(std::string line, StringArray& directories) {
         readLockerTimeout(words);
     } else if (key == SMASHv2_CUSTOMIZATION_KEY) {
         readCustomization(words);
-    } else if (key == releaseClaimKey) {
+    } else if (key == kReleaseClaimKey) {
         readReleaseClaimAfterCheck(words);
     } else if (key == SMASHv2_FWFILE_PATH_KEY) {
         std::string list;
@@ -131,9 +131,9 @@ void SMASHv2Config::readLine(std::string line, StringArray& directories) {
 void SMASHv2Config::readNamespace(std::istream& words) {
     std::string word;
     words >> word;
-    if (word.compare(0, rootNamespace.size(), rootNamespace) != 0) return;
+    if (word.compare(0, kRootNamespace.size(), kRootNamespace) != 0) return;
     m_namespace = std::move(word);
-    formatDebugLog(__FILE__, readingFunction, __LINE__, "Read NameSpace : %s", m_namespace.c_str());
+    formatDebugLog(__FILE__, kReadingFunction, __LINE__, "Read NameSpace : %s", m_namespace.c_str());
 }
 
 void SMASHv2Config::readLockerTimeout(std::istream& words) {
@@ -141,7 +141,7 @@ void SMASHv2Config::readLockerTimeout(std::istream& words) {
     words >> word;
     toUint(word, m_lockerTimeout);
     // Also after a refusal, with the value that stands.
-    formatDebugLog(__FILE__, readingFunction, __LINE__, "Read LockerTimeout : %d",
+    formatDebugLog(__FILE__, kReadingFunction, __LINE__, "Read LockerTimeout : %d",
                    static_cast<std::int32_t>(m_lockerTimeout));
 }
 
@@ -149,7 +149,7 @@ void SMASHv2Config::readCustomization(std::istream& words) {
     std::uint16_t value = 0;
     if (!(words >> value)) return;
     m_oemCustomization = value;
-    formatDebugLog(__FILE__, readingFunction, __LINE__, "Read OEMCustomizeable : %d", value);
+    formatDebugLog(__FILE__, kReadingFunction, __LINE__, "Read OEMCustomizeable : %d", value);
 }
 
 void SMASHv2Config::readReleaseClaimAfterCheck(std::istream& words) {
@@ -157,7 +157,7 @@ void SMASHv2Config::readReleaseClaimAfterCheck(std::istream& words) {
     words >> word;
     if (word != "0" && word != "1") return;
     m_releaseClaimAfterCheck = word == "1";
-    formatDebugLog(__FILE__, readingFunction, __LINE__, "Read ReleaseClaimAfterCheck : %d",
+    formatDebugLog(__FILE__, kReadingFunction, __LINE__, "Read ReleaseClaimAfterCheck : %d",
                    m_releaseClaimAfterCheck);
 }
 

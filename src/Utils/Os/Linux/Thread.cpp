@@ -15,9 +15,9 @@ namespace utils {
 namespace {
 
 // The lines of a thread's end name the destructor, whose sequence it is.
-constexpr const char* endFunction = "~Thread";
-constexpr int joinDelays = 3;
-constexpr unsigned int joinDelayMilliseconds = 100;
+constexpr const char* kEndFunction = "~Thread";
+constexpr int kJoinDelays = 3;
+constexpr unsigned int kJoinDelayMilliseconds = 100;
 
 /// Says for a scope that the body runs.
 class InExecute {
@@ -80,12 +80,12 @@ bool Thread::isStopRequested() const noexcept {
 void Thread::shutdown() noexcept {
     if (m_data == nullptr) return;
     const void* const address = this;
-    formatDebugLog(__FILE__, endFunction, __LINE__, "Thread::~Thread(%p)", address);
+    formatDebugLog(__FILE__, kEndFunction, __LINE__, "Thread::~Thread(%p)", address);
     m_data->stopRequested = true;
-    for (int i = 0; i < joinDelays && m_data->inExecute; ++i) {
-        formatDebugLog(__FILE__, endFunction, __LINE__,
+    for (int i = 0; i < kJoinDelays && m_data->inExecute; ++i) {
+        formatDebugLog(__FILE__, kEndFunction, __LINE__,
                        "Thread %p is still in 'execute' method. Little delay before join...", address);
-        msleep(joinDelayMilliseconds);
+        msleep(kJoinDelayMilliseconds);
     }
     if (m_data->started) join();
     m_data.reset();
@@ -96,7 +96,7 @@ void Thread::join() noexcept {
     const bool isOwn = pthread_equal(m_data->handle, pthread_self()) != 0;
     const int status = isOwn ? EDEADLK : pthread_join(m_data->handle, nullptr);
     if (status != 0) {
-        formatDebugLog(__FILE__, endFunction, __LINE__, "Thread %p: join status is %d",
+        formatDebugLog(__FILE__, kEndFunction, __LINE__, "Thread %p: join status is %d",
                        static_cast<const void*>(this), status);
     }
     if (isOwn) pthread_detach(m_data->handle);

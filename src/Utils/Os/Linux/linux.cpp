@@ -13,6 +13,7 @@
 #include <cstdlib>
 #include <memory>
 #include <string_view>
+#include <system_error>
 
 #include "Utils/Exception.h"
 #include "Utils/Log.h"
@@ -35,6 +36,18 @@ int openForReading(const std::string& path) noexcept {
 
 bool isReadableKind(const struct stat& status) noexcept {
     return S_ISDIR(status.st_mode) || (S_ISREG(status.st_mode) && status.st_size <= INT32_MAX);
+}
+
+/// Fills the buffer as far as the file goes; returns 0, or the errno value of what stopped it.
+int readUpTo(const Descriptor& file, std::span<std::uint8_t> buffer, std::size_t& count) noexcept {
+    for (count = 0; count < buffer.size();) {
+        const ssize_t result = read(file.number(), buffer.data() + count, buffer.size() - count);
+        if (result < 0 && errno == EINTR) continue;
+        if (result < 0) return errno;
+        if (result == 0) break;
+        count += static_cast<std::size_t>(result);
+    }
+    return 0;
 }
 
 [[noreturn]] void failToOpen(const std::string& path) {
@@ -96,13 +109,27 @@ std::size_t readFile(const std::string& path, std::span<std::uint8_t> buffer) no
     const Descriptor file(openForReading(path));
     if (file.number() < 0 || fstat(file.number(), &status) != 0 || !S_ISREG(status.st_mode)) return 0;
     std::size_t count = 0;
-    while (count < buffer.size()) {
-        const ssize_t result = read(file.number(), buffer.data() + count, buffer.size() - count);
-        if (result < 0 && errno == EINTR) continue;
-        if (result <= 0) break;
-        count += static_cast<std::size_t>(result);
-    }
+    readUpTo(file, buffer, count);
     return count;
+}
+
+std::optional<std::vector<std::uint8_t>> readWholeFile(const std::string& path, std::size_t most) {
+    constexpr std::size_t kStep = std::size_t{256} * 1024;
+    const Descriptor file(openForReading(path));
+    if (file.number() < 0 && errno == ENOENT) return std::nullopt;
+    std::vector<std::uint8_t> bytes;
+    int error = file.number() < 0 ? errno : 0;
+    // Read in steps, not by the size that the system tells: files in /proc have none, and a file may grow.
+    for (bool more = true; more && error == 0 && bytes.size() < most;) {
+        const std::size_t length = bytes.size();
+        bytes.resize(std::min(most, length + kStep));
+        std::size_t count = 0;
+        error = readUpTo(file, std::span(bytes).subspan(length), count);
+        more = length + count == bytes.size();
+        bytes.resize(length + count);
+    }
+    if (error != 0) throw std::system_error(error, std::generic_category(), "cannot read " + path);
+    return bytes;
 }
 
 bool isThisADir(const std::string& path) noexcept {

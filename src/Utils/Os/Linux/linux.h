@@ -2,8 +2,10 @@
 
 #include <cstddef>
 #include <cstdint>
+#include <optional>
 #include <span>
 #include <string>
+#include <vector>
 
 #include "Utils/Export.h"
 #include "Utils/StringArray.h"
@@ -33,6 +35,11 @@ QUENX_EXPORT std::int32_t getFileSize(const std::string& path);
 /// Fills the buffer from the beginning of a regular file. Returns the bytes read: fewer than asked for when
 /// the file is shorter, cannot be read on, or is none. Never blocks on a FIFO or a device, never throws.
 QUENX_EXPORT std::size_t readFile(const std::string& path, std::span<std::uint8_t> buffer) noexcept;
+
+/// The first `most` bytes of a file, or as many as it has; nothing when there is no file of that name. A FIFO
+/// never blocks. @throws std::system_error "cannot read PATH: REASON"
+QUENX_EXPORT std::optional<std::vector<std::uint8_t>> readWholeFile(const std::string& path,
+                                                                    std::size_t most);
 
 /// True exactly when the path can be opened as a directory.
 QUENX_EXPORT bool isThisADir(const std::string& path) noexcept;

@@ -4,6 +4,8 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include <system_error>
+
 #include "Support/Nobody.h"
 #include "Support/SyslogCapture.h"
 #include "Support/TempFolder.h"
@@ -25,7 +27,7 @@ std::string couldNotOpen(const std::string& path) {
 
 }  // namespace
 
-TEST(FileSize, IsGivenForRegularFilesOnly) {
+TEST(FileSizeTest, IsGivenForRegularFilesOnly) {
     const test::TempFolder folder;
     const test::LogLevelGuard guard(2);
     const std::string file = folder.write("file", "12345");
@@ -42,7 +44,7 @@ TEST(FileSize, IsGivenForRegularFilesOnly) {
     EXPECT_EQ(sizeOf(fifo), couldNotOpen(fifo));  // and does not hang
 }
 
-TEST(FileSize, UnreadableFilesAndDescriptorZeroCountAsFailure) {
+TEST(FileSizeTest, FailsForUnreadableFilesAndDescriptorZero) {
     const test::TempFolder folder;
     ASSERT_EQ(chmod(folder.path().c_str(), 0755), 0);
     const std::string secret = folder.write("secret", "x");
@@ -63,7 +65,27 @@ TEST(FileSize, UnreadableFilesAndDescriptorZeroCountAsFailure) {
         testing::ExitedWithCode(0), "");
 }
 
-TEST(Linux, NamesTheInterfacesOfTheHost) {
+TEST(LinuxTest, ReadsWholeFilesUpToALimit) {
+    const test::TempFolder folder;
+    const std::string large(600 * 1024, 'x');
+    const auto sizeRead = [&](const std::string& path, std::size_t most) {
+        return os::readWholeFile(path, most).value().size();
+    };
+    EXPECT_EQ(sizeRead(folder.write("large", large), SIZE_MAX), large.size());
+    EXPECT_EQ(sizeRead(folder / "large", 300 * 1024), 300U * 1024);
+    EXPECT_GT(sizeRead("/proc/self/status", 4096), 0U) << "a file whose size the system does not tell";
+    ASSERT_EQ(mkfifo((folder / "fifo").c_str(), 0600), 0);
+    EXPECT_EQ(sizeRead(folder / "fifo", 10), 0U) << "and does not hang";
+    EXPECT_EQ(os::readWholeFile(folder / "missing", 10), std::nullopt);
+    try {
+        os::readWholeFile(folder.path(), 10);
+        FAIL() << "a directory was read";
+    } catch (const std::system_error& error) {
+        EXPECT_EQ(error.what(), "cannot read " + folder.path() + ": Is a directory");
+    }
+}
+
+TEST(LinuxTest, NamesTheInterfacesOfTheHost) {
     for (const std::string& interface : os::getNetworkInterfaceNames()) {
         EXPECT_EQ(access(("/sys/class/net/" + interface).c_str(), F_OK), 0) << interface;
     }

@@ -14,8 +14,8 @@ using Lines = std::vector<std::string>;
 
 namespace {
 
-struct ConfigTest : ::testing::Test {
-    ConfigTest() { SyslogCapture::clear(); }  // the lines of opening the log and of construction
+struct SMASHv2ConfigTest : ::testing::Test {
+    SMASHv2ConfigTest() { SyslogCapture::clear(); }  // the lines of opening the log and of construction
     void write(const std::string& content) { folder.write("conf", content); }
     test::TempFolder folder;
     SMASHv2Config config{folder / "conf"};
@@ -24,7 +24,7 @@ struct ConfigTest : ::testing::Test {
 
 }  // namespace
 
-TEST_F(ConfigTest, LinesAreReadAsTheySayAndLogged) {
+TEST_F(SMASHv2ConfigTest, ReadsAndLogsEachLine) {
     const struct {
         const char* line;
         const char* cimNamespace;
@@ -63,7 +63,7 @@ TEST_F(ConfigTest, LinesAreReadAsTheySayAndLogged) {
     }
 }
 
-TEST_F(ConfigTest, ARemovedKeyKeepsItsValueAndADowngradeStaysForbidden) {
+TEST_F(SMASHv2ConfigTest, KeepsTheValueOfARemovedKeyAndTheBanOnDowngrades) {
     EXPECT_TRUE(config.isDowngradeEnabled());  // no file yet
     write("Namespace=root/a\nOEMCustomizeable=5\nReleaseClaimAfterCheck=1\n");
     EXPECT_TRUE(config.getReleaseClaimAfterCheck());
@@ -76,7 +76,7 @@ TEST_F(ConfigTest, ARemovedKeyKeepsItsValueAndADowngradeStaysForbidden) {
     EXPECT_FALSE(config.getReleaseClaimAfterCheck());
 }
 
-TEST_F(ConfigTest, DirectoriesAreBuiltAnewFromEveryLine) {
+TEST_F(SMASHv2ConfigTest, BuildsDirectoriesAnewFromEveryLine) {
     const std::string one = folder / "one", two = folder / "two", three = folder / "three";
     for (const std::string& path : {one, two, three})
         ASSERT_EQ(mkdir(path.c_str(), 0700), 0);
@@ -89,7 +89,7 @@ TEST_F(ConfigTest, DirectoriesAreBuiltAnewFromEveryLine) {
     EXPECT_TRUE(config.getFirmwareFilesPaths().empty());
 }
 
-TEST_F(ConfigTest, ManyThreadsQueryWhileTheFileChanges) {
+TEST_F(SMASHv2ConfigTest, AnswersManyThreadsWhileTheFileChanges) {
     test::LogLevelGuard quiet(0);
     std::vector<std::thread> threads;
     for (int i = 0; i < 4; ++i) {

@@ -44,7 +44,7 @@ struct ThreadTest : ::testing::Test {
 
 }  // namespace
 
-TEST_F(ThreadTest, ABodyThatIgnoresTheStopIsJoinedAfterThreeDelays) {
+TEST_F(ThreadTest, JoinsABodyThatIgnoresTheStopAfterThreeDelays) {
     std::atomic<bool> isRunning{false};
     bool isFinished = false;
     std::string address;
@@ -67,7 +67,7 @@ TEST_F(ThreadTest, ABodyThatIgnoresTheStopIsJoinedAfterThreeDelays) {
     EXPECT_EQ(SyslogCapture::count("(~Thread@Thread.cpp:"), 4U);
 }
 
-TEST_F(ThreadTest, ABodyThatHasEndedOrNeverBegunIsNotWaitedFor) {
+TEST_F(ThreadTest, DoesNotWaitForABodyThatHasEndedOrNeverBegun) {
     std::atomic<pid_t> id{0};
     {
         Worker unstarted([](Worker&) { ADD_FAILURE(); });
@@ -79,7 +79,7 @@ TEST_F(ThreadTest, ABodyThatHasEndedOrNeverBegunIsNotWaitedFor) {
     EXPECT_EQ(SyslogCapture::messages().size(), 2U);
 }
 
-TEST_F(ThreadTest, AStopBeforeTheBeginningKeepsTheBodyFromRunning) {
+TEST_F(ThreadTest, DoesNotRunTheBodyAfterAStopBeforeTheBeginning) {
     bool hasRun = false;
     {
         Worker worker([&](Worker&) { hasRun = true; });
@@ -95,7 +95,7 @@ TEST_F(ThreadTest, AStopBeforeTheBeginningKeepsTheBodyFromRunning) {
     }
 }
 
-TEST_F(ThreadTest, AnExceptionOfTheBodyEndsTheThreadOnly) {
+TEST_F(ThreadTest, AloneEndsOnAnExceptionOfTheBody) {
     Worker worker([](Worker&) { throw std::runtime_error("%n"); });
     worker.start();
     const std::string line = "Thread " + worker.address() + " ended by an exception: %n";
@@ -105,7 +105,7 @@ TEST_F(ThreadTest, AnExceptionOfTheBodyEndsTheThreadOnly) {
     waitUntil([] { return SyslogCapture::contains("ended by an unknown exception"); });
 }
 
-TEST_F(ThreadTest, ASecondStartIsRefused) {
+TEST_F(ThreadTest, RefusesASecondStart) {
     Worker worker([](Worker&) {});
     worker.start();
     EXPECT_THROW(worker.start(), utils::Exception);
@@ -113,7 +113,7 @@ TEST_F(ThreadTest, ASecondStartIsRefused) {
         formatStr("Could not start thread %s. Error %d", worker.address().c_str(), EALREADY)));
 }
 
-TEST_F(ThreadTest, AThreadThatDestroysItselfIsNotJoinedByItself) {
+TEST_F(ThreadTest, DoesNotJoinItselfWhenItDestroysItself) {
     std::atomic<bool> isStarted{false}, isGone{false};
     auto* const worker = new Worker([&isStarted, flag = &isGone](Worker& self) {
         waitUntil([&] { return isStarted.load(); });
