@@ -36,7 +36,7 @@ class InstantBackend : public ma::Backend {
 
     int prepareFlashImage(const std::string&, const uint8_t*, uint32_t, uint8_t*, uint32_t*,
                           std::vector<utils::FirmwareType>&) override {
-        return ma::PREPARED;
+        return ma::PrepareStatus::Prepared;
     }
 
     bool writeFlashImage(const std::string&, const uint8_t*, uint32_t, uint32_t&, std::string&) override {

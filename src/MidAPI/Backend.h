@@ -25,15 +25,16 @@ class QUENX_EXPORT Backend {
     virtual bool getCanBeUpdated(const std::string& adapter) = 0;
     virtual bool getAdapterFirmwareVersion(const std::string& adapter,
                                            std::vector<utils::FirmwareVersionInfo>& components) = 0;
-    virtual int prepareFlashImage(const std::string& adapter, const uint8_t* file, uint32_t fileSize,
-                                  uint8_t* output, uint32_t* imageSize,
+    virtual int prepareFlashImage(const std::string& adapter, const std::uint8_t* file,
+                                  std::uint32_t fileSize, std::uint8_t* output, std::uint32_t* imageSize,
                                   std::vector<utils::FirmwareType>& types) = 0;
-    virtual bool writeFlashImage(const std::string& adapter, const uint8_t* image, uint32_t imageSize,
-                                 uint32_t& errorCode, std::string& errorText) = 0;
+    virtual bool writeFlashImage(const std::string& adapter, const std::uint8_t* image,
+                                 std::uint32_t imageSize, std::uint32_t& errorCode,
+                                 std::string& errorText) = 0;
     virtual bool updateCapabilityWord(const std::string& adapter,
-                                      const std::vector<utils::FirmwareType>& types, uint32_t& errorCode,
+                                      const std::vector<utils::FirmwareType>& types, std::uint32_t& errorCode,
                                       std::string& errorText) = 0;
-    virtual uint16_t getFlashImageUpdateProgress(const std::string& adapter) = 0;
+    virtual std::uint16_t getFlashImageUpdateProgress(const std::string& adapter) = 0;
     virtual bool setBootType(const std::string& adapter, BootType type) = 0;
     virtual AdapterInfo getAdapterInfo(const std::string& adapter) = 0;
 };

@@ -11,10 +11,10 @@
 namespace ma {
 namespace {
 
-constexpr const char* DESCRIPTION_VARIABLE = "QUENX_ADAPTERS";
-constexpr const char* STATE_VARIABLE = "QUENX_ADAPTER_STATE";
-constexpr const char* DEFAULT_DESCRIPTION = "/etc/quenx-adapters.toml";
-constexpr const char* DEFAULT_STATE = "/var/lib/quenx/adapters";
+constexpr const char* kDescriptionVariable = "QUENX_ADAPTERS";
+constexpr const char* kStateVariable = "QUENX_ADAPTER_STATE";
+constexpr const char* kDefaultDescription = "/etc/quenx-adapters.toml";
+constexpr const char* kDefaultState = "/var/lib/quenx/adapters";
 
 std::string environmentOr(const char* variable, const char* otherwise) {
     const char* value = std::getenv(variable);
@@ -22,11 +22,11 @@ std::string environmentOr(const char* variable, const char* otherwise) {
 }
 
 std::shared_ptr<Backend> makeDefaultBackend() {
-    const std::string description = environmentOr(DESCRIPTION_VARIABLE, "");
-    const std::string state = environmentOr(STATE_VARIABLE, DEFAULT_STATE);
+    const std::string description = environmentOr(kDescriptionVariable, "");
+    const std::string state = environmentOr(kStateVariable, kDefaultState);
     if (!description.empty()) return std::make_shared<Simulator>(description, state);
-    if (::access(DEFAULT_DESCRIPTION, F_OK) == 0)
-        return std::make_shared<Simulator>(DEFAULT_DESCRIPTION, state);
+    if (::access(kDefaultDescription, F_OK) == 0)
+        return std::make_shared<Simulator>(kDefaultDescription, state);
     return std::make_shared<Simulator>(std::vector<AdapterDescription>{}, state);
 }
 
@@ -60,6 +60,9 @@ std::shared_ptr<Backend> backend() {
 
 }  // namespace
 
+AdapterError::AdapterError(const std::string& text) : utils::Exception("%s", text.c_str()) {}
+AdapterError::~AdapterError() = default;
+
 Backend::~Backend() = default;
 
 utils::StringArray enumerateAdapters() {
@@ -78,22 +81,23 @@ bool getAdapterFirmwareVersion(std::string adapter, std::vector<utils::FirmwareV
     return backend()->getAdapterFirmwareVersion(adapter, components);
 }
 
-int prepareFlashImage(std::string adapter, const uint8_t* file, uint32_t fileSize, uint8_t* output,
-                      uint32_t* imageSize, std::vector<utils::FirmwareType>& types) {
+int prepareFlashImage(std::string adapter, const std::uint8_t* file, std::uint32_t fileSize,
+                      std::uint8_t* output, std::uint32_t* imageSize,
+                      std::vector<utils::FirmwareType>& types) {
     return backend()->prepareFlashImage(adapter, file, fileSize, output, imageSize, types);
 }
 
-bool writeFlashImage(std::string adapter, const uint8_t* image, uint32_t imageSize, uint32_t& errorCode,
-                     std::string& errorText) {
+bool writeFlashImage(std::string adapter, const std::uint8_t* image, std::uint32_t imageSize,
+                     std::uint32_t& errorCode, std::string& errorText) {
     return backend()->writeFlashImage(adapter, image, imageSize, errorCode, errorText);
 }
 
-bool updateCapabilityWord(std::string adapter, std::vector<utils::FirmwareType> types, uint32_t& errorCode,
-                          std::string& errorText) {
+bool updateCapabilityWord(std::string adapter, std::vector<utils::FirmwareType> types,
+                          std::uint32_t& errorCode, std::string& errorText) {
     return backend()->updateCapabilityWord(adapter, types, errorCode, errorText);
 }
 
-uint16_t getFlashImageUpdateProgress(std::string adapter) {
+std::uint16_t getFlashImageUpdateProgress(std::string adapter) {
     return backend()->getFlashImageUpdateProgress(adapter);
 }
 

@@ -43,29 +43,29 @@ QUENX_EXPORT bool getAdapterFirmwareVersion(std::string adapter,
 /// has;
 ///                       out: the types of the prepared image, ascending. Unchanged where the output is not
 ///                       filled.
-/// @return a PrepareStatus. Output, size and types are filled for PREPARED, IMAGE_IS_OLDER and
-/// IMAGE_TYPES_DIFFER,
+/// @return a PrepareStatus. Output, size and types are filled for PrepareStatus::Prepared,
+/// PrepareStatus::ImageIsOlder and PrepareStatus::ImageTypesDiffer,
 ///         since a caller may insist on the latter two. The reason of any other status than 0 is logged.
 /// Sets the port's progress to 0, unless it is being written to.
-QUENX_EXPORT int prepareFlashImage(std::string adapter, const uint8_t* file, uint32_t fileSize,
-                                   uint8_t* output, uint32_t* imageSize,
+QUENX_EXPORT int prepareFlashImage(std::string adapter, const std::uint8_t* file, std::uint32_t fileSize,
+                                   std::uint8_t* output, std::uint32_t* imageSize,
                                    std::vector<utils::FirmwareType>& types);
 
 /// Writes a prepared image to a port: images of the types in it replace those on the port, the others stay.
 /// Blocks until done. Returns true and leaves 0 and an empty text on success, false with a WriteError (or the
 /// device's own code) and its text otherwise; the old firmware is then whole.
-QUENX_EXPORT bool writeFlashImage(std::string adapter, const uint8_t* image, uint32_t imageSize,
-                                  uint32_t& errorCode, std::string& errorText);
+QUENX_EXPORT bool writeFlashImage(std::string adapter, const std::uint8_t* image, std::uint32_t imageSize,
+                                  std::uint32_t& errorCode, std::string& errorText);
 
 /// Enables the boot images of these types in the port's capability word (bit n stands for type n) and
 /// disables those that the flash no longer holds. Results as writeFlashImage().
 QUENX_EXPORT bool updateCapabilityWord(std::string adapter, std::vector<utils::FirmwareType> types,
-                                       uint32_t& errorCode, std::string& errorText);
+                                       std::uint32_t& errorCode, std::string& errorText);
 
 /// Percentage, 0 to 100, of the update of this port: 0 from a prepare to its write, 100 once the new image is
 /// the one that the port boots. Never goes back during a write, and stays until the next prepare. 0 for an
 /// unknown name.
-QUENX_EXPORT uint16_t getFlashImageUpdateProgress(std::string adapter);
+QUENX_EXPORT std::uint16_t getFlashImageUpdateProgress(std::string adapter);
 
 /// Sets the boot protocol of a port. Returns false when that failed.
 QUENX_EXPORT bool setBootType(std::string adapter, BootType type);

@@ -2,7 +2,7 @@
 #include <string_view>
 
 #include "Fuzz/Require.h"
-#include "MidAPI/AdapterError.h"
+#include "MidAPI/AdapterTypes.h"
 #include "MidAPI/Simulator/Simulator.h"
 
 namespace {

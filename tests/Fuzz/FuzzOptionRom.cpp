@@ -58,7 +58,7 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
             input.target.deviceId = rom.images[0].deviceId;
         }
         const ma::Preparation prepared = ma::assessImage(input.target, input.file, input.requested);
-        require(prepared.reason.empty() == (prepared.status == ma::PREPARED));
+        require(prepared.reason.empty() == (prepared.status == ma::PrepareStatus::Prepared));
         require(ma::hasOutput(prepared.status) == !prepared.chosen.empty());
         if (!ma::hasOutput(prepared.status)) continue;
         require(std::is_sorted(prepared.types.begin(), prepared.types.end()) && !prepared.types.empty());

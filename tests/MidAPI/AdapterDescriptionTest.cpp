@@ -3,7 +3,7 @@
 #include <gtest/gtest.h>
 #include <sys/stat.h>
 
-#include "MidAPI/AdapterError.h"
+#include "MidAPI/AdapterTypes.h"
 #include "MidAPI/Simulator/Simulator.h"
 #include "Support/SimulatedAdapters.h"
 #include "Support/TestRoms.h"
@@ -29,7 +29,7 @@ std::string adapterWith(const std::string& line) {
     return adapterAt("0000:03:00.0") + line + "\n";
 }
 
-TEST(AdapterDescription, keysThatFewAdaptersHaveAreTaken) {
+TEST(AdapterDescriptionTest, TakesKeysThatFewAdaptersHave) {
     const std::string text = adapterWith(R"(subsystem_id = "1af4:1100"
 components = [ { type = "IMG_CLP", revision = 65535 }, { type = "IMG_UEFI" } ]
 [[adapter.fault]]
@@ -46,7 +46,7 @@ text = "bank gone")");
     EXPECT_TRUE(fault.once && fault.milliseconds == 5 && fault.text == "bank gone");
 }
 
-TEST(AdapterDescription, addresses) {
+TEST(AdapterDescriptionTest, ReadsAddresses) {
     const auto addressOf = [](const std::string& address) {
         return ma::parseAdapterDescriptions(adapterAt(address), "a.toml").at(0).address;
     };
@@ -57,13 +57,22 @@ TEST(AdapterDescription, addresses) {
         EXPECT_THROW(addressOf(address), ma::AdapterError) << address;
 }
 
-TEST(AdapterDescription, mistakesAreNamedWithPlaceAndRemedy) {
+TEST(AdapterDescriptionTest, NamesMistakesWithPlaceAndRemedy) {
     const std::pair<std::string, const char*> table[] = {
         {"[[adapter]]\nname =", "a.toml, line 2: "},
         {"\n[adaptor]", "a.toml, line 2: adapter description: unknown key \"adaptor\"; the keys are adapter"},
         {"adapter = [ 1 ]", "line 1: adapter description: \"adapter\" must be a list of tables"},
-        {"a = 1\n\xEF\xB7\xB6", "a.toml, line 2: "},  // U+FDB6 and a letter: see MidAPI/Toml.h
-        {"a = [[1\n\xD2\x99]]", "a.toml, line 2: "},
+        {"[[[", "a.toml, line 1: "},
+        {"a = [}", "a.toml, line 1: "},
+        {"a = 1 # \xC3\xA4\n\xC3\xA4 = 1", "a.toml, line 2: a character beyond ASCII stands outside quotes"},
+        {"a = [[1\n\xEF\xB7\xB6]]", "a.toml, line 2: a character beyond ASCII"},
+        {"a = '\\' \xC3\xA4", "a.toml, line 1: a character beyond ASCII"},
+        {R"(a = """b""""")"
+         "\n\xC3\xA4",
+         "a.toml, line 2: a character beyond ASCII"},
+        {"a = \"\"\"b\\\n \xEF\xBB\xB5\"\"\"", "a.toml, line 2: a character beyond ASCII"},
+        {"\xEF\xBB\xBF# \xC3\xA4\na = ['\xC3\xA4#', \"\\\"\xC3\xA4'\", \"\"\"\n\xC3\xA4\"\"\"]",
+         "line 2: adapter description: unknown key"},
         {"[[adapter]]", "line 1: adapter 1: \"name\" is missing; write for example name = \"eth0\""},
         {"[[adapter]]\nname = 7", "line 2: adapter 1: \"name\" must be a text in quotes"},
         {"[[adapter]]\nname = \"a\\nb\"", "\"name\" is \"a?b\""},
@@ -85,7 +94,7 @@ TEST(AdapterDescription, mistakesAreNamedWithPlaceAndRemedy) {
     }
 }
 
-TEST(AdapterDescription, filesThatCannotBeUsedAreNamed) {
+TEST(AdapterDescriptionTest, NamesFilesThatCannotBeUsed) {
     const test::TempFolder folder;
     const auto startWith = [&](const std::string& description) {
         return errorOf([&] { ma::Simulator(description, folder / "state"); });
@@ -97,12 +106,12 @@ TEST(AdapterDescription, filesThatCannotBeUsedAreNamed) {
     const std::string description = folder.write("a.toml", adapterWith("flash_file = \"card.rom\""));
     EXPECT_NE(std::string::npos, startWith(description).find("card.rom is not there"));
     folder.write("card.rom", "no rom at all, but long enough for a header");
-    EXPECT_NE(std::string::npos, startWith(description).find("is no intact ROM image: image 1 at 0x0"));
+    EXPECT_NE(std::string::npos, startWith(description).find("is not an intact ROM image: image 1 at 0x0"));
     folder.write("fifo.toml", adapterWith("flash_file = \"fifo\""));
     EXPECT_NE(std::string::npos, startWith(folder / "fifo.toml").find("the file is empty"));
 }
 
-TEST(AdapterDescription, theFactoryFlashIsTheFileWithTheListedComponents) {
+TEST(AdapterDescriptionTest, MakesTheFactoryFlashOfTheFileAndTheListedComponents) {
     const test::SimulatedAdapters adapters(
         adapterWith("flash_file = \"" + test::realRomPath("efi-virtio") +
                     "\"\ncomponents = [ { type = \"IMG_UEFI\", revision = 9 }, "

@@ -12,12 +12,13 @@ namespace {
 
 using utils::FirmwareType;
 using enum utils::FirmwareType;
-using Rom = std::vector<uint8_t>;
+using Rom = std::vector<std::uint8_t>;
 using Types = std::vector<FirmwareType>;
 
-constexpr auto NO_SUCH = static_cast<FirmwareType>(77);
+constexpr auto kNoSuch = static_cast<FirmwareType>(77);
 
-Rom pxeFor(uint16_t device, std::vector<uint16_t> others, uint32_t classCode = ma::rom::ETHERNET_CLASS) {
+Rom pxeFor(std::uint16_t device, std::vector<std::uint16_t> others,
+           std::uint32_t classCode = ma::rom::kEthernetClass) {
     return ma::makeRomImage({.type = PXE,
                              .vendorId = 0x1af4,
                              .deviceId = device,
@@ -64,7 +65,7 @@ std::vector<Case> allCases() {
         {"empty", "eth0", {}, {}, 1, {}, "the file is empty"},
         {"no such adapter", "eth9", virtio, {}, 1, {}, "no such adapter"},
         {"a type it lacks", "eth0", virtio, {iSCSI, PXE}, 5, {iSCSI, PXE}, "no image of type IMG_iSCSI"},
-        {"a number that is no type", "eth0", virtio, {NO_SUCH}, 5, {NO_SUCH}, "no image of type 77"},
+        {"a number that is no type", "eth0", virtio, {kNoSuch}, 5, {kNoSuch}, "no image of type 77"},
         {"older", "eth0", older, {}, 3, {PXE, UEFI}, "IMG_PXE would go back from version 1 (installed) to 0"},
         {"the part that is not older", "eth0", older, {UEFI}, 0, {UEFI}, ""},
         {"older with other types", "eth0", olderAndMore, {}, 4, {iSCSI, PXE}, "adapter carries"},
@@ -77,7 +78,7 @@ std::vector<Case> allCases() {
     };
 }
 
-TEST(ImagePreparation, answersByTheTable) {
+TEST(ImagePreparationTest, AnswersByTheTable) {
     const test::SimulatedAdapters adapters;
     for (const Case& one : allCases()) {
         SCOPED_TRACE(one.what);
@@ -101,17 +102,18 @@ TEST(ImagePreparation, answersByTheTable) {
     }
 }
 
-TEST(ImagePreparation, losingTheClpEntryIsAnotherType) {
+TEST(ImagePreparationTest, TakesTheLossOfTheClpEntryForAnotherType) {
     const ma::PreparationTarget target{0x1af4, 0x1041, true, {{CLP, 1}, {PXE, 1}}};
-    EXPECT_EQ(ma::IMAGE_TYPES_DIFFER, ma::assessImage(target, test::madeRom({{PXE, 1}}), {}).status);
-    EXPECT_EQ(ma::PREPARED, ma::assessImage(target, test::madeRom({{CLP, 1}}), {PXE}).status);
+    EXPECT_EQ(ma::PrepareStatus::ImageTypesDiffer,
+              ma::assessImage(target, test::madeRom({{PXE, 1}}), {}).status);
+    EXPECT_EQ(ma::PrepareStatus::Prepared, ma::assessImage(target, test::madeRom({{CLP, 1}}), {PXE}).status);
 }
 
-TEST(ImagePreparation, aBufferThatIsTooSmallIsInvalid) {
+TEST(ImagePreparationTest, RefusesABufferThatIsTooSmall) {
     const test::SimulatedAdapters adapters;
     const Rom rom = test::madeRom({{PXE, 1}});
     Rom output(rom.size() - 1);
-    auto imageSize = static_cast<uint32_t>(output.size());
+    auto imageSize = static_cast<std::uint32_t>(output.size());
     Types types;
     EXPECT_EQ(1, ma::prepareFlashImage("eth0", rom.data(), imageSize + 1, output.data(), &imageSize, types));
 }

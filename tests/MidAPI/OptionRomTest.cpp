@@ -6,22 +6,22 @@
 #include <functional>
 #include <numeric>
 
-#include "MidAPI/Image/ByteView.h"
 #include "MidAPI/Image/OptionRomWriter.h"
+#include "MidAPI/Image/RomFormat.h"
 #include "Support/TestRoms.h"
 
 namespace {
 
 using utils::FirmwareType;
 using enum utils::FirmwareType;
-using Rom = std::vector<uint8_t>;
+using Rom = std::vector<std::uint8_t>;
 
 void mend(Rom& image) {
-    const auto sum = static_cast<uint8_t>(std::accumulate(image.begin(), image.end(), 0U));
-    image[ma::rom::HEADER_CHECKSUM] = static_cast<uint8_t>(image[ma::rom::HEADER_CHECKSUM] - sum);
+    const auto sum = static_cast<std::uint8_t>(std::accumulate(image.begin(), image.end(), 0U));
+    image[ma::rom::kHeaderChecksum] = static_cast<std::uint8_t>(image[ma::rom::kHeaderChecksum] - sum);
 }
 
-TEST(OptionRom, tellsTypesByCodeProductAndClpEntry) {
+TEST(OptionRomTest, TellsTypesByCodeProductAndClpEntry) {
     EXPECT_EQ("IMG_CLP 7, IMG_PXE 7", test::describeRom(test::madeRom({{CLP, 7}})));
     EXPECT_EQ("IMG_iSCSI 2, IMG_UEFI 3, IMG_FCoE 1",
               test::describeRom(test::madeRom({{FCoE, 1}, {iSCSI, 2}, {UEFI, 3}})));
@@ -30,25 +30,25 @@ TEST(OptionRom, tellsTypesByCodeProductAndClpEntry) {
     EXPECT_FALSE(ma::firmwareTypeFromName(""));
 }
 
-TEST(OptionRom, findsTheProductNameInAChainOfHeaders) {
+TEST(OptionRomTest, FindsTheProductNameInAChainOfHeaders) {
     Rom rom = test::madeRom({{PXE, 1}});
-    constexpr std::size_t FIRST = 0x40;
-    constexpr std::size_t SECOND = 0x180;
-    std::copy_n(rom.begin() + FIRST, ma::rom::PNP_LENGTH, rom.begin() + SECOND);
+    constexpr std::size_t kFirst = 0x40;
+    constexpr std::size_t kSecond = 0x180;
+    std::copy_n(rom.begin() + kFirst, ma::rom::kPnpLength, rom.begin() + kSecond);
     const std::string_view product = "Boot by ISCSI";
     std::copy(product.begin(), product.end(), rom.begin() + 0x1C0);
-    ma::writeLe16(rom, SECOND + ma::rom::PNP_PRODUCT, 0x1C0);
-    ma::writeLe16(rom, FIRST + ma::rom::PNP_NEXT, SECOND);
+    ma::writeLe16(rom, kSecond + ma::rom::kPnpProduct, 0x1C0);
+    ma::writeLe16(rom, kFirst + ma::rom::kPnpNext, kSecond);
     mend(rom);
     EXPECT_EQ("IMG_iSCSI 1", test::describeRom(rom));
 
-    ma::writeLe16(rom, SECOND + ma::rom::PNP_PRODUCT, 0);
-    ma::writeLe16(rom, SECOND + ma::rom::PNP_NEXT, FIRST);  // a ring
+    ma::writeLe16(rom, kSecond + ma::rom::kPnpProduct, 0);
+    ma::writeLe16(rom, kSecond + ma::rom::kPnpNext, kFirst);  // a ring
     mend(rom);
     EXPECT_EQ("IMG_PXE 1", test::describeRom(rom));
 }
 
-TEST(OptionRom, namesWhatIsBroken) {
+TEST(OptionRomTest, NamesWhatIsBroken) {
     struct Broken {
         const char* error;  // a part of the text
         std::function<void(Rom&)> damage;
@@ -73,7 +73,7 @@ TEST(OptionRom, namesWhatIsBroken) {
         {"no end",
          [](Rom& rom) {
              ma::writeLe16(rom, PCIR + 0x08, 0x300);
-             std::fill(rom.begin() + 0x300, rom.end(), uint8_t{0xFF});
+             std::fill(rom.begin() + 0x300, rom.end(), std::uint8_t{0xFF});
          }},
         {"checksum is wrong", [](Rom& rom) { ++rom[0x300]; }},
         {"EFI signature", [](Rom& rom) { rom[PCIR + 0x14] = 3; }},
@@ -93,7 +93,7 @@ TEST(OptionRom, namesWhatIsBroken) {
     }
 }
 
-TEST(OptionRom, everyTruncationOfARealImageIsAnError) {
+TEST(OptionRomTest, TakesEveryTruncationOfARealImageForAnError) {
     const Rom whole = test::realRom("pxe-virtio");
     for (std::size_t length = 0; length < whole.size(); length = length < 600 ? length + 1 : length + 4093) {
         Rom cut = whole;

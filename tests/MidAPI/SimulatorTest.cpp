@@ -10,8 +10,8 @@
 #include <set>
 #include <thread>
 
-#include "MidAPI/AdapterError.h"
-#include "MidAPI/Simulator/FlashState.h"
+#include "MidAPI/AdapterTypes.h"
+#include "MidAPI/Simulator/FlashStore.h"
 #include "MidAPI/ma.h"
 #include "Support/SimulatedAdapters.h"
 #include "Support/TestRoms.h"
@@ -20,7 +20,7 @@ namespace {
 
 using utils::FirmwareType;
 using enum utils::FirmwareType;
-using Rom = std::vector<uint8_t>;
+using Rom = std::vector<std::uint8_t>;
 
 /// Prepares and writes; the prepare must allow it, if need be by force.
 test::WriteResult install(const std::string& adapter, const Rom& file, std::vector<FirmwareType> types = {}) {
@@ -29,12 +29,12 @@ test::WriteResult install(const std::string& adapter, const Rom& file, std::vect
     return test::writeImage(adapter, prepared.image);
 }
 
-TEST(Simulator, capabilityWordAndBootTypeAreKept) {
+TEST(SimulatorTest, KeepsCapabilityWordAndBootType) {
     test::SimulatedAdapters adapters;
-    uint32_t code = 9;
+    std::uint32_t code = 9;
     std::string text = "old";
     EXPECT_EQ(0b11000U, adapters->flashState("eth0").capabilityWord);
-    EXPECT_EQ(static_cast<uint32_t>(ma::BootType::iSCSI), adapters->flashState("eth4").bootType);
+    EXPECT_EQ(static_cast<std::uint32_t>(ma::BootType::iSCSI), adapters->flashState("eth4").bootType);
     EXPECT_TRUE(install("eth0", test::madeRom({{CLP, 2}})).done);
     EXPECT_TRUE(ma::updateCapabilityWord("eth0", {CLP, PXE, iSCSI}, code, text));
     EXPECT_TRUE(code == 0 && text.empty());
@@ -44,14 +44,15 @@ TEST(Simulator, capabilityWordAndBootTypeAreKept) {
     EXPECT_EQ(0U, adapters->flashState("eth4").bootType);
 }
 
-TEST(Simulator, whatIsNoImageForTheCardIsNotWritten) {
+TEST(SimulatorTest, WritesOnlyImagesForTheCard) {
     const test::SimulatedAdapters adapters;
     Rom broken = test::madeRom({{PXE, 9}});
     broken.back() ^= 1;
-    EXPECT_EQ(ma::ERROR_BAD_IMAGE, test::writeImage("eth0", broken).code);
-    EXPECT_EQ(ma::ERROR_BAD_IMAGE, test::writeImage("eth0", {}).code);
-    EXPECT_EQ(ma::ERROR_BAD_IMAGE, test::writeImage("eth0", test::madeRom({{PXE, 9}}, 0x10ec, 0x8139)).code);
-    EXPECT_EQ(ma::ERROR_NOT_UPDATABLE,
+    EXPECT_EQ(ma::WriteError::BadImage, test::writeImage("eth0", broken).code);
+    EXPECT_EQ(ma::WriteError::BadImage, test::writeImage("eth0", {}).code);
+    EXPECT_EQ(ma::WriteError::BadImage,
+              test::writeImage("eth0", test::madeRom({{PXE, 9}}, 0x10ec, 0x8139)).code);
+    EXPECT_EQ(ma::WriteError::NotUpdatable,
               test::writeImage("eth3", test::madeRom({{PXE, 9}}, 0x1022, 0x2000)).code);
     EXPECT_EQ("IMG_PXE 1, IMG_UEFI 0", test::componentsOf("eth0"));
 
@@ -59,7 +60,7 @@ TEST(Simulator, whatIsNoImageForTheCardIsNotWritten) {
     const auto images = [](FirmwareType type) {
         const Rom one = test::madeRom({{type, 9}});
         Rom many(40 * one.size());
-        ma::composeOptionRom(std::vector<std::span<const uint8_t>>(40, one), many);
+        ma::composeOptionRom(std::vector<std::span<const std::uint8_t>>(40, one), many);
         return many;
     };
     EXPECT_TRUE(test::writeImage("eth0", images(PXE)).done);
@@ -68,19 +69,19 @@ TEST(Simulator, whatIsNoImageForTheCardIsNotWritten) {
     EXPECT_EQ("IMG_PXE 9, IMG_UEFI 0", test::componentsOf("eth0"));
 }
 
-TEST(Simulator, aDeviceThatCannotBeWrittenSaysWhy) {
+TEST(SimulatorTest, SaysWhyADeviceCannotBeWritten) {
     const test::SimulatedAdapters adapters;
     adapters.folder().write("state", "a file where the folder should be");
     const test::WriteResult result = test::writeImage("eth0", test::madeRom({{PXE, 9}}));
-    EXPECT_EQ(ma::ERROR_DEVICE, result.code);
+    EXPECT_EQ(ma::WriteError::DeviceFailed, result.code);
     EXPECT_NE(std::string::npos, result.text.find("Not a directory")) << result.text;
 }
 
-TEST(Simulator, damageIsSurvivedWhereABankIsLeftAndNamedWhereNot) {
+TEST(SimulatorTest, SurvivesDamageWhereABankIsLeftAndNamesItWhereNot) {
     test::SimulatedAdapters adapters;
     EXPECT_TRUE(install("eth0", test::madeRom({{PXE, 2}})).done);
     EXPECT_TRUE(install("eth0", test::madeRom({{PXE, 3}})).done);
-    const uint8_t active = adapters->flashState("eth0").activeBank;
+    const std::uint8_t active = adapters->flashState("eth0").activeBank;
     adapters.folder().write("state/eth0/bank-" + std::to_string(active) + ".rom", "worn out");
     adapters.restart();
     EXPECT_EQ("IMG_PXE 2, IMG_UEFI 0", test::componentsOf("eth0"));
@@ -93,7 +94,7 @@ TEST(Simulator, damageIsSurvivedWhereABankIsLeftAndNamedWhereNot) {
     EXPECT_EQ("IMG_PXE 1, IMG_UEFI 0", test::componentsOf("eth1"));
 }
 
-TEST(Simulator, namesOfAnyPrintableKindAreKeptApart) {
+TEST(SimulatorTest, KeepsPrintableNamesOfAnyKindApart) {
     std::string description;
     int bus = 10;
     for (const std::string name : {"../eth0", "a/b", "\xC3\xA4 \\\"x\\\"", "%2e", "."})
@@ -112,7 +113,7 @@ TEST(Simulator, namesOfAnyPrintableKindAreKeptApart) {
 /// Looks at the progress from within every step of a write.
 class WatchedFiles : public ma::FlashFiles {
   public:
-    void write(int descriptor, std::span<const uint8_t> bytes) override {
+    void write(int descriptor, std::span<const std::uint8_t> bytes) override {
         FlashFiles::write(descriptor, bytes);
         // From another thread, and with a prepare in between: neither may disturb the write.
         std::thread([this] { seen.push_back(ma::getFlashImageUpdateProgress("eth0")); }).join();
@@ -124,40 +125,40 @@ class WatchedFiles : public ma::FlashFiles {
                   second.text);
     }
 
-    std::vector<uint16_t> seen;
+    std::vector<std::uint16_t> seen;
 };
 
-TEST(Simulator, progressMovesOnlyForward) {
+TEST(SimulatorTest, MovesProgressOnlyForward) {
     const test::TempFolder folder;
     const auto files = std::make_shared<WatchedFiles>();
     const auto simulator = std::make_shared<ma::Simulator>(
-        ma::parseAdapterDescriptions(test::TEST_ADAPTERS, ""), folder.path(), files);
+        ma::parseAdapterDescriptions(test::kTestAdapters, ""), folder.path(), files);
     const auto previous = ma::setBackend(simulator);
     const test::PreparedImage prepared = test::prepareImage("eth0", test::realRom("pxe-virtio"));
     EXPECT_EQ(0, ma::getFlashImageUpdateProgress("eth0"));
     EXPECT_TRUE(test::writeImage("eth0", prepared.image).done);
     EXPECT_EQ(100, ma::getFlashImageUpdateProgress("eth0"));
     EXPECT_TRUE(std::is_sorted(files->seen.begin(), files->seen.end()));
-    EXPECT_LT(15, std::set<uint16_t>(files->seen.begin(), files->seen.end()).size());
+    EXPECT_LT(15, std::set<std::uint16_t>(files->seen.begin(), files->seen.end()).size());
     EXPECT_EQ(99, files->seen.back()) << "100 only when it is in force";
 
     simulator->injectFault("eth0", {.percent = 50, .code = 1, .text = "worn out", .once = true});
     EXPECT_EQ(0, test::prepareImage("eth0", test::realRom("pxe-virtio")).status);
     EXPECT_EQ(0, ma::getFlashImageUpdateProgress("eth0"));
     EXPECT_FALSE(test::writeImage("eth0", prepared.image).done);
-    const uint16_t reached = ma::getFlashImageUpdateProgress("eth0");
+    const std::uint16_t reached = ma::getFlashImageUpdateProgress("eth0");
     EXPECT_TRUE(reached >= 49 && reached < 60) << reached;
     EXPECT_TRUE(test::writeImage("eth0", prepared.image).done);
     ma::setBackend(previous);
 }
 
-TEST(Simulator, portsAreUpdatedAndReadAtOnce) {
+TEST(SimulatorTest, UpdatesAndReadsPortsAtOnce) {
     const test::SimulatedAdapters adapters;
     std::atomic<int> running = 2;
     std::vector<std::thread> threads;
     for (const char* name : {"eth0", "eth1"})
         threads.emplace_back([&running, name, rom = test::realRom("pxe-virtio")] {
-            for (uint16_t revision = 1; revision <= 8; ++revision)
+            for (std::uint16_t revision = 1; revision <= 8; ++revision)
                 EXPECT_TRUE(install(name, test::withRevision(rom, revision)).done);
             --running;
         });
@@ -175,7 +176,7 @@ TEST(Simulator, portsAreUpdatedAndReadAtOnce) {
     EXPECT_EQ("IMG_PXE 8, IMG_UEFI 0", test::componentsOf("eth1"));
 }
 
-TEST(Backend, isChosenByCallThenEnvironment) {
+TEST(BackendTest, IsChosenByCallThenEnvironment) {
     const test::SimulatedAdapters adapters;
     ::setenv("QUENX_ADAPTERS", adapters.descriptionFile().c_str(), 1);
     ::setenv("QUENX_ADAPTER_STATE", adapters.stateDirectory().c_str(), 1);
@@ -193,21 +194,21 @@ TEST(Backend, isChosenByCallThenEnvironment) {
     ::setenv("QUENX_ADAPTERS", (adapters.folder() / "late.toml").c_str(), 1);
     ma::setBackend(nullptr);
     EXPECT_THROW(ma::enumerateAdapters(), ma::AdapterError);
-    adapters.folder().write("late.toml", test::TEST_ADAPTERS);
+    adapters.folder().write("late.toml", test::kTestAdapters);
     EXPECT_EQ(5U, ma::enumerateAdapters().size());
     ::unsetenv("QUENX_ADAPTERS");
     ::unsetenv("QUENX_ADAPTER_STATE");
     ma::setBackend(mine);
 }
 
-TEST(Backend, answersUntilTheProcessHasEnded) {
+TEST(BackendTest, AnswersUntilTheProcessHasEnded) {
     // As a provider that is still loaded then: its destructor waits for the flash that runs.
     const auto provider = [] {
         if (ma::enumerateAdapters().size() != 5 || !install("eth0", test::madeRom({{PXE, 9}})).done)
             ::_exit(1);
     };
     const test::TempFolder folder;
-    const std::string description = folder.write("adapters.toml", test::TEST_ADAPTERS);
+    const std::string description = folder.write("adapters.toml", test::kTestAdapters);
     EXPECT_EXIT(
         {
             std::atexit(provider);

@@ -117,7 +117,7 @@ class UpdatePowerLossTest : public test::UpdateTest {
     static std::shared_ptr<ma::Simulator> powerOn(const std::string& root,
                                                   std::shared_ptr<ma::FlashFiles> files) {
         auto simulator = std::make_shared<ma::Simulator>(
-            ma::parseAdapterDescriptions(test::TEST_ADAPTERS, ""), root, std::move(files));
+            ma::parseAdapterDescriptions(test::kTestAdapters, ""), root, std::move(files));
         ma::setBackend(simulator);
         return simulator;
     }

@@ -4,7 +4,7 @@
 
 namespace test {
 
-const char* const TEST_ADAPTERS = R"(
+const char* const kTestAdapters = R"(
 [[adapter]]
 name = "eth0"
 pci_address = "0000:03:00.0"
@@ -67,22 +67,22 @@ void SimulatedAdapters::restart() {
     ma::setBackend(m_simulator);
 }
 
-PreparedImage prepareImage(const std::string& adapter, const std::vector<uint8_t>& file,
+PreparedImage prepareImage(const std::string& adapter, const std::vector<std::uint8_t>& file,
                            std::vector<utils::FirmwareType> types) {
     PreparedImage result;
     result.image.resize(file.size());
     result.types = std::move(types);
-    auto size = static_cast<uint32_t>(file.size());
+    auto size = static_cast<std::uint32_t>(file.size());
     result.status =
         ma::prepareFlashImage(adapter, file.data(), size, result.image.data(), &size, result.types);
     result.image.resize(size);
     return result;
 }
 
-WriteResult writeImage(const std::string& adapter, const std::vector<uint8_t>& image) {
+WriteResult writeImage(const std::string& adapter, const std::vector<std::uint8_t>& image) {
     WriteResult result;
-    result.done = ma::writeFlashImage(adapter, image.data(), static_cast<uint32_t>(image.size()), result.code,
-                                      result.text);
+    result.done = ma::writeFlashImage(adapter, image.data(), static_cast<std::uint32_t>(image.size()),
+                                      result.code, result.text);
     return result;
 }
 

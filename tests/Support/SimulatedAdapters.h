@@ -18,7 +18,7 @@ namespace test {
 ///   eth3        1022:2000, bus 5; cannot be updated
 ///   eth4        15ad:07b0, bus 6; IMG_iSCSI 1 and IMG_UEFI 0
 /// All are written at full speed. The flash is made of small images, so that tests are fast.
-extern const char* const TEST_ADAPTERS;
+extern const char* const kTestAdapters;
 
 /// The simulator's files without the waiting for the medium, which tests have no use for: much faster.
 class UnsyncedFiles : public ma::FlashFiles {
@@ -32,7 +32,7 @@ class UnsyncedFiles : public ma::FlashFiles {
 class SimulatedAdapters {
   public:
     /// @param description  the text of an adapter description
-    explicit SimulatedAdapters(std::string_view description = TEST_ADAPTERS);
+    explicit SimulatedAdapters(std::string_view description = kTestAdapters);
     SimulatedAdapters(const SimulatedAdapters&) = delete;
     SimulatedAdapters& operator=(const SimulatedAdapters&) = delete;
     ~SimulatedAdapters();
@@ -59,19 +59,19 @@ class SimulatedAdapters {
 /// What ma::prepareFlashImage() made of a file.
 struct PreparedImage {
     int status = 0;
-    std::vector<uint8_t> image;              ///< `imageSize` bytes of the output
+    std::vector<std::uint8_t> image;         ///< `imageSize` bytes of the output
     std::vector<utils::FirmwareType> types;  ///< as they were left
 };
-PreparedImage prepareImage(const std::string& adapter, const std::vector<uint8_t>& file,
+PreparedImage prepareImage(const std::string& adapter, const std::vector<std::uint8_t>& file,
                            std::vector<utils::FirmwareType> types = {});
 
 /// What ma::writeFlashImage() answered.
 struct WriteResult {
     bool done = false;
-    uint32_t code = 0;
+    std::uint32_t code = 0;
     std::string text;
 };
-WriteResult writeImage(const std::string& adapter, const std::vector<uint8_t>& image);
+WriteResult writeImage(const std::string& adapter, const std::vector<std::uint8_t>& image);
 
 /// "IMG_PXE 1, IMG_UEFI 0": what the adapter says that it carries.
 std::string componentsOf(const std::string& adapter);

@@ -26,7 +26,7 @@ std::string TempFolder::write(std::string_view name, std::string_view content) c
     return path;
 }
 
-std::string TempFolder::write(std::string_view name, std::span<const uint8_t> content) const {
+std::string TempFolder::write(std::string_view name, std::span<const std::uint8_t> content) const {
     return write(name, std::string(content.begin(), content.end()));
 }
 
@@ -35,7 +35,7 @@ void writeTestFile(const std::string& path, std::string_view content) {
     EXPECT_TRUE(file << content << std::flush) << path;
 }
 
-std::vector<uint8_t> readTestFile(const std::string& path) {
+std::vector<std::uint8_t> readTestFile(const std::string& path) {
     std::ifstream file(path, std::ios::binary);
     EXPECT_TRUE(file) << path;
     return {std::istreambuf_iterator<char>(file), {}};

@@ -22,7 +22,7 @@ class TempFolder {
 
     /// Writes a file in the folder and returns its path.
     std::string write(std::string_view name, std::string_view content) const;
-    std::string write(std::string_view name, std::span<const uint8_t> content) const;
+    std::string write(std::string_view name, std::span<const std::uint8_t> content) const;
 
   private:
     std::filesystem::path m_path;
@@ -32,6 +32,6 @@ class TempFolder {
 void writeTestFile(const std::string& path, std::string_view content);
 
 /// All bytes of a file; a failed expectation and nothing when it cannot be read.
-std::vector<uint8_t> readTestFile(const std::string& path);
+std::vector<std::uint8_t> readTestFile(const std::string& path);
 
 }  // namespace test

@@ -8,31 +8,32 @@ std::string realRomPath(std::string_view name) {
     return "/usr/lib/ipxe/qemu/" + std::string(name) + ".rom";
 }
 
-std::vector<uint8_t> realRom(std::string_view name) {
+std::vector<std::uint8_t> realRom(std::string_view name) {
     return readTestFile(realRomPath(name));
 }
 
-std::vector<uint8_t> withRevision(std::vector<uint8_t> rom, utils::FirmwareType type, uint16_t revision) {
+std::vector<std::uint8_t> withRevision(std::vector<std::uint8_t> rom, utils::FirmwareType type,
+                                       std::uint16_t revision) {
     for (const ma::RomImage& image : ma::parseOptionRom(rom).images)
         if (image.carries(type)) ma::setCodeRevision(rom, image, revision);
     return rom;
 }
 
-std::vector<uint8_t> withRevision(std::vector<uint8_t> rom, uint16_t revision) {
+std::vector<std::uint8_t> withRevision(std::vector<std::uint8_t> rom, std::uint16_t revision) {
     for (const ma::RomImage& image : ma::parseOptionRom(rom).images)
         ma::setCodeRevision(rom, image, revision);
     return rom;
 }
 
-std::vector<uint8_t> madeRom(const std::vector<utils::FirmwareVersionInfo>& components, uint16_t vendor,
-                             uint16_t device) {
-    std::vector<uint8_t> rom;
+std::vector<std::uint8_t> madeRom(const std::vector<utils::FirmwareVersionInfo>& components,
+                                  std::uint16_t vendor, std::uint16_t device) {
+    std::vector<std::uint8_t> rom;
     for (const utils::FirmwareVersionInfo& component : components) {
         ma::NewRomImage image;
         image.type = component.type;
         image.vendorId = vendor;
         image.deviceId = device;
-        image.codeRevision = static_cast<uint16_t>(component.version);
+        image.codeRevision = static_cast<std::uint16_t>(component.version);
         rom = ma::mergeOptionRoms(rom, ma::makeRomImage(image));
     }
     return rom;
@@ -46,7 +47,7 @@ std::string describeComponents(const std::vector<utils::FirmwareVersionInfo>& co
     return text;
 }
 
-std::string describeRom(const std::vector<uint8_t>& rom) {
+std::string describeRom(const std::vector<std::uint8_t>& rom) {
     return describeComponents(ma::parseOptionRom(rom).components());
 }
 

@@ -16,20 +16,21 @@ namespace test {
 std::string realRomPath(std::string_view name);
 
 /// Its bytes.
-std::vector<uint8_t> realRom(std::string_view name);
+std::vector<std::uint8_t> realRom(std::string_view name);
 
 /// A ROM with the code revision of its images of one type changed, and its sum mended.
-std::vector<uint8_t> withRevision(std::vector<uint8_t> rom, utils::FirmwareType type, uint16_t revision);
+std::vector<std::uint8_t> withRevision(std::vector<std::uint8_t> rom, utils::FirmwareType type,
+                                       std::uint16_t revision);
 
 /// A ROM with the code revision of all its images changed.
-std::vector<uint8_t> withRevision(std::vector<uint8_t> rom, uint16_t revision);
+std::vector<std::uint8_t> withRevision(std::vector<std::uint8_t> rom, std::uint16_t revision);
 
 /// A small ROM (1024 bytes an image) for the device 1af4:1041, or for another one.
-std::vector<uint8_t> madeRom(const std::vector<utils::FirmwareVersionInfo>& components,
-                             uint16_t vendor = 0x1af4, uint16_t device = 0x1041);
+std::vector<std::uint8_t> madeRom(const std::vector<utils::FirmwareVersionInfo>& components,
+                                  std::uint16_t vendor = 0x1af4, std::uint16_t device = 0x1041);
 
 /// "IMG_PXE 1, IMG_UEFI 0"
 std::string describeComponents(const std::vector<utils::FirmwareVersionInfo>& components);
-std::string describeRom(const std::vector<uint8_t>& rom);
+std::string describeRom(const std::vector<std::uint8_t>& rom);
 
 }  // namespace test

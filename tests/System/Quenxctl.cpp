@@ -6,7 +6,7 @@
 namespace test {
 
 void Quenxctl::describeAdapters(const std::string& fault) {
-    std::string description = TEST_ADAPTERS;
+    std::string description = kTestAdapters;
     if (!fault.empty()) {
         description.insert(description.find("[[adapter]]\nname = \"eth1\""),
                            "[[adapter.fault]]\nat = \"write\"\n" + fault + "\n");

@@ -17,7 +17,7 @@ RunningDaemon::RunningDaemon(const std::vector<std::string>& options,
     m_folder.write("quenx-cimd.toml",
                    "[listen]\nhttps_port = 0\nhttp = true\nhttp_port = 0\n[auth]\nmethod = 'users'\n");
     m_folder.write("provider.conf", "");
-    m_folder.write("adapters.toml", TEST_ADAPTERS);
+    m_folder.write("adapters.toml", kTestAdapters);
     command.push_back(QUENX_CIMD);
     const std::pair<const char*, const char*> files[] = {{"--config", "quenx-cimd.toml"},
                                                          {"--tls-certificate", "cert.pem"},

@@ -3,14 +3,14 @@
 
 #include "Host/Daemon/SettingsField.h"
 #include "MidAPI/Toml.h"
+#include "Utils/Os/Linux/linux.h"
 
 namespace host {
 
 namespace {
 
 std::string placeOf(const std::string& file, const toml::source_region& source) {
-    // A file that cannot be read has no line.
-    return source.begin.line == 0 ? file : file + ":" + std::to_string(source.begin.line);
+    return file + ":" + std::to_string(source.begin.line);
 }
 
 std::string textOf(const toml::node& node, const std::string& place) {
@@ -60,10 +60,14 @@ void setField(const std::vector<SettingsField>& fields, const std::string& key, 
 }
 
 toml::table parse(const std::string& file) {
-    toml::parse_result parsed = toml::parse_file(file);
-    if (parsed) return std::move(parsed).table();
-    const toml::parse_error& error = parsed.error();
-    throw std::runtime_error(placeOf(file, error.source()) + ": " + std::string(error.description()));
+    constexpr std::size_t kMostText = std::size_t{1} << 20;
+    const auto bytes = os::readWholeFile(file, kMostText);
+    if (!bytes) throw std::runtime_error(file + ": there is no such file");
+    try {
+        return ma::parseToml({reinterpret_cast<const char*>(bytes->data()), bytes->size()});
+    } catch (const ma::TomlError& error) {
+        throw std::runtime_error(file + ":" + std::to_string(error.line()) + ": " + error.what());
+    }
 }
 
 }  // namespace

@@ -60,7 +60,7 @@ bool isWanted(const RomImage& image, const Types& requested) {
                        [&image](utils::FirmwareType type) { return image.carries(type); });
 }
 
-std::optional<uint32_t> versionOf(const Components& components, utils::FirmwareType type) {
+std::optional<std::uint32_t> versionOf(const Components& components, utils::FirmwareType type) {
     for (const utils::FirmwareVersionInfo& component : components)
         if (component.type == type) return component.version;
     return std::nullopt;
@@ -73,8 +73,8 @@ std::string notApplicable(const RomFile& rom, const Types& requested, const RomF
         if (versionOf(inFile, type)) continue;
         const std::string_view name = firmwareTypeName(type);
         return "the file has no image of type " +
-               (name.empty() ? std::to_string(static_cast<int32_t>(type)) : std::string(name)) + ", it has " +
-               typeNames(inFile);
+               (name.empty() ? std::to_string(static_cast<std::int32_t>(type)) : std::string(name)) +
+               ", it has " + typeNames(inFile);
     }
     return chosen.images.empty() ? "the file has no image that an adapter could be given" : "";
 }
@@ -92,7 +92,7 @@ bool typesDiffer(const PreparationTarget& target, const RomFile& chosen) {
 /// Names the component that would go back; both versions, installed one first.
 std::string downgrade(const PreparationTarget& target, const RomFile& chosen) {
     for (const utils::FirmwareVersionInfo& component : chosen.components()) {
-        const uint32_t installed = versionOf(target.components, component.type).value_or(0);
+        const std::uint32_t installed = versionOf(target.components, component.type).value_or(0);
         if (component.version < installed)
             return std::string(firmwareTypeName(component.type)) + " would go back from version " +
                    std::to_string(installed) + " (installed) to " + std::to_string(component.version) +
@@ -110,42 +110,45 @@ RomFile chooseImages(const RomFile& rom, const Types& requested) {
 
 }  // namespace
 
-Preparation assessImage(const PreparationTarget& target, std::span<const uint8_t> file,
+Preparation assessImage(const PreparationTarget& target, std::span<const std::uint8_t> file,
                         const std::vector<utils::FirmwareType>& requested) {
     const RomFile rom = parseOptionRom(file);
     // A file for another card is called that even when it is damaged too: mending it would not help.
     if (std::string reason = anyMismatch(target, rom); !reason.empty())
-        return refuse(IMAGE_NOT_SUPPORTED, std::move(reason));
-    if (rom.error) return refuse(INVALID_PARAMETER, "the file is no intact ROM image: " + *rom.error);
-    if (!target.canBeUpdated) return refuse(IMAGE_NOT_SUPPORTED, "this adapter cannot be updated");
+        return refuse(PrepareStatus::ImageNotSupported, std::move(reason));
+    if (rom.error)
+        return refuse(PrepareStatus::InvalidParameter, "the file is not an intact ROM image: " + *rom.error);
+    if (!target.canBeUpdated)
+        return refuse(PrepareStatus::ImageNotSupported, "this adapter cannot be updated");
 
     const Types wanted = normalised(requested);
     RomFile chosen = chooseImages(rom, wanted);
     if (std::string reason = notApplicable(rom, wanted, chosen); !reason.empty())
-        return refuse(IMAGE_NOT_APPLICABLE, std::move(reason));
+        return refuse(PrepareStatus::ImageNotApplicable, std::move(reason));
 
     Preparation result;
     const Components incoming = chosen.components();
     for (const utils::FirmwareVersionInfo& component : incoming)
         result.types.push_back(component.type);
     if (typesDiffer(target, chosen)) {
-        result.status = IMAGE_TYPES_DIFFER;
+        result.status = PrepareStatus::ImageTypesDiffer;
         result.reason =
             "the image has " + typeNames(incoming) + ", the adapter carries " + typeNames(target.components);
     } else if (result.reason = downgrade(target, chosen); !result.reason.empty()) {
-        result.status = IMAGE_IS_OLDER;
+        result.status = PrepareStatus::ImageIsOlder;
     }
     result.chosen = std::move(chosen.images);
     return result;
 }
 
 bool hasOutput(PrepareStatus status) {
-    return status == PREPARED || status == IMAGE_IS_OLDER || status == IMAGE_TYPES_DIFFER;
+    return status == PrepareStatus::Prepared || status == PrepareStatus::ImageIsOlder ||
+           status == PrepareStatus::ImageTypesDiffer;
 }
 
-std::size_t composeChosen(const Preparation& preparation, std::span<const uint8_t> file,
-                          std::span<uint8_t> output) {
-    std::vector<std::span<const uint8_t>> images;
+std::size_t composeChosen(const Preparation& preparation, std::span<const std::uint8_t> file,
+                          std::span<std::uint8_t> output) {
+    std::vector<std::span<const std::uint8_t>> images;
     images.reserve(preparation.chosen.size());
     for (const RomImage& image : preparation.chosen)
         images.push_back(imageBytes(file, image));

@@ -15,24 +15,25 @@ namespace ma {
 
 /// The adapter port that an image is held against.
 struct PreparationTarget {
-    uint16_t vendorId = 0;
-    uint16_t deviceId = 0;
+    std::uint16_t vendorId = 0;
+    std::uint16_t deviceId = 0;
     bool canBeUpdated = true;
     std::vector<utils::FirmwareVersionInfo> components;  ///< what it carries, one per type
 };
 
 /// The verdict on an image file.
 struct Preparation {
-    PrepareStatus status = PREPARED;
-    std::string reason;            ///< a sentence for people; empty for PREPARED
-    std::vector<RomImage> chosen;  ///< the images to write; filled for PREPARED and the two that force allows
+    PrepareStatus status = PrepareStatus::Prepared;
+    std::string reason;  ///< a sentence for people; empty for PrepareStatus::Prepared
+    std::vector<RomImage>
+        chosen;  ///< the images to write; filled for PrepareStatus::Prepared and the two that force allows
     std::vector<utils::FirmwareType> types;  ///< of those, ascending
 };
 
 /// Holds an image file against an adapter, without writing anything: which images of `requested` types (type
 /// 0 ignored; none stands for all) would be written, and what speaks against it. The order of the tests is
 /// the order of the table in README.md. Free of state; never reads outside `file`.
-QUENX_EXPORT Preparation assessImage(const PreparationTarget& target, std::span<const uint8_t> file,
+QUENX_EXPORT Preparation assessImage(const PreparationTarget& target, std::span<const std::uint8_t> file,
                                      const std::vector<utils::FirmwareType>& requested);
 
 /// True when the output of the preparation is an image that may be written.
@@ -40,7 +41,7 @@ QUENX_EXPORT bool hasOutput(PrepareStatus status);
 
 /// Writes the chosen images as one chain; `output` is at least as long as the file. Returns the chain's
 /// length.
-QUENX_EXPORT std::size_t composeChosen(const Preparation& preparation, std::span<const uint8_t> file,
-                                       std::span<uint8_t> output);
+QUENX_EXPORT std::size_t composeChosen(const Preparation& preparation, std::span<const std::uint8_t> file,
+                                       std::span<std::uint8_t> output);
 
 }  // namespace ma

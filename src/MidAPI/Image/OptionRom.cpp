@@ -5,15 +5,14 @@
 #include <cinttypes>
 #include <cstdio>
 
-#include "MidAPI/Image/ByteView.h"
-#include "MidAPI/Image/RomChecksum.h"
+#include "MidAPI/Image/RomFormat.h"
 
 namespace ma {
 namespace {
 
-using Bytes = std::span<const uint8_t>;
+using Bytes = std::span<const std::uint8_t>;
 
-constexpr std::array<std::string_view, 6> TYPE_NAMES = {"",        "IMG_CLP",  "IMG_iSCSI",
+constexpr std::array<std::string_view, 6> kTypeNames = {"",        "IMG_CLP",  "IMG_iSCSI",
                                                         "IMG_PXE", "IMG_UEFI", "IMG_FCoE"};
 
 /// What is wrong with the image at hand; the offset is from the start of the image.
@@ -33,10 +32,10 @@ std::string describe(std::size_t imageNumber, std::size_t imageOffset, const Fla
 
 /// The NUL-terminated text at an offset of the image; empty when there is none.
 std::string textAt(Bytes image, std::size_t offset) {
-    constexpr std::size_t LONGEST = 255;
+    constexpr std::size_t kLongest = 255;
     std::string text;
     if (offset == 0) return text;
-    for (; offset < image.size() && image[offset] != 0 && text.size() < LONGEST; ++offset) {
+    for (; offset < image.size() && image[offset] != 0 && text.size() < kLongest; ++offset) {
         const char character = static_cast<char>(image[offset]);
         text += character >= ' ' && character <= '~' ? character : '?';
     }
@@ -58,88 +57,88 @@ utils::FirmwareType typeOfProduct(std::string_view product) {
 /// one the first header's texts stay. An image without such a header is in order: older ones have none.
 void readPnp(Bytes image, RomImage& out) {
     out.type = utils::FirmwareType::PXE;
-    std::size_t offset = readLe16(image, rom::HEADER_PNP);
-    for (int header = 0; header < rom::MAX_PNP_HEADERS && offset != 0; ++header) {
-        if (!fitsIn(offset, rom::PNP_LENGTH, image.size())) return;
+    std::size_t offset = readLe16(image, rom::kHeaderPnp);
+    for (int header = 0; header < rom::kMaxPnpHeaders && offset != 0; ++header) {
+        if (!fitsIn(offset, rom::kPnpLength, image.size())) return;
         if (!std::equal(image.begin() + static_cast<std::ptrdiff_t>(offset),
                         image.begin() + static_cast<std::ptrdiff_t>(offset + 4), "$PnP"))
             return;
-        std::string product = textAt(image, readLe16(image, offset + rom::PNP_PRODUCT));
+        std::string product = textAt(image, readLe16(image, offset + rom::kPnpProduct));
         const utils::FirmwareType type = typeOfProduct(product);
         if (header == 0 || type != utils::FirmwareType::PXE) {
-            out.manufacturer = textAt(image, readLe16(image, offset + rom::PNP_MANUFACTURER));
+            out.manufacturer = textAt(image, readLe16(image, offset + rom::kPnpManufacturer));
             out.product = std::move(product);
             out.type = type;
         }
         if (type != utils::FirmwareType::PXE) return;
-        offset = readLe16(image, offset + rom::PNP_NEXT);
+        offset = readLe16(image, offset + rom::kPnpNext);
     }
 }
 
 /// The list of further device ids; `data` is the image from the start of its PCI data structure on.
 MaybeFlaw readDeviceList(Bytes data, RomImage& out) {
-    std::size_t offset = readLe16(data, rom::PCIR_DEVICE_LIST);
+    std::size_t offset = readLe16(data, rom::kPcirDeviceList);
     if (offset == 0) return std::nullopt;
     // Else a change of the last-image bit or the revision would change the list.
-    if (offset < readLe16(data, rom::PCIR_LENGTH))
-        return Flaw{out.dataStructure + rom::PCIR_DEVICE_LIST,
+    if (offset < readLe16(data, rom::kPcirLength))
+        return Flaw{out.dataStructure + rom::kPcirDeviceList,
                     "the list of device ids lies inside the PCI data structure"};
     for (; fitsIn(offset, 2, data.size()); offset += 2) {
-        const uint16_t id = readLe16(data, offset);
+        const std::uint16_t id = readLe16(data, offset);
         if (id == 0) return std::nullopt;
         out.furtherDeviceIds.push_back(id);
     }
-    return Flaw{out.dataStructure + rom::PCIR_DEVICE_LIST, "the list of device ids has no end"};
+    return Flaw{out.dataStructure + rom::kPcirDeviceList, "the list of device ids has no end"};
 }
 
 /// Finds the PCI data structure and the length of the image that starts `rest`.
 MaybeFlaw locate(Bytes rest, RomImage& out) {
-    if (rest.size() < rom::HEADER_LENGTH) return Flaw{0, "the file ends inside the image header"};
-    if (readLe16(rest, 0) != rom::SIGNATURE) return Flaw{0, "the signature 55 AA is missing"};
-    const std::size_t offset = readLe16(rest, rom::HEADER_DATA_STRUCTURE);
-    if (offset < rom::HEADER_LENGTH || !fitsIn(offset, rom::PCIR_LENGTH_REVISION_0, rest.size()))
-        return Flaw{rom::HEADER_DATA_STRUCTURE, "the PCI data structure lies outside the image"};
+    if (rest.size() < rom::kHeaderLength) return Flaw{0, "the file ends inside the image header"};
+    if (readLe16(rest, 0) != rom::kSignature) return Flaw{0, "the signature 55 AA is missing"};
+    const std::size_t offset = readLe16(rest, rom::kHeaderDataStructure);
+    if (offset < rom::kHeaderLength || !fitsIn(offset, rom::kPcirLengthRevision0, rest.size()))
+        return Flaw{rom::kHeaderDataStructure, "the PCI data structure lies outside the image"};
     const Bytes data = rest.subspan(offset);
     if (!std::equal(data.begin(), data.begin() + 4, "PCIR"))
         return Flaw{offset, "the PCI data structure does not begin with \"PCIR\""};
-    const std::size_t length = readLe16(data, rom::PCIR_IMAGE_UNITS) * rom::UNIT;
-    if (length == 0) return Flaw{offset + rom::PCIR_IMAGE_UNITS, "the image length is 0"};
+    const std::size_t length = readLe16(data, rom::kPcirImageUnits) * rom::kBlockSize;
+    if (length == 0) return Flaw{offset + rom::kPcirImageUnits, "the image length is 0"};
     if (length > rest.size()) {
-        return Flaw{offset + rom::PCIR_IMAGE_UNITS,
+        return Flaw{offset + rom::kPcirImageUnits,
                     "the image is " + std::to_string(length) + " bytes long, but the file has only " +
                         std::to_string(rest.size()) + " left: it is cut short"};
     }
-    const std::size_t structureLength = readLe16(data, rom::PCIR_LENGTH);
-    if (structureLength < rom::PCIR_LENGTH_REVISION_0 || !fitsIn(offset, structureLength, length))
-        return Flaw{offset + rom::PCIR_LENGTH, "the length of the PCI data structure is wrong"};
-    out.dataStructure = static_cast<uint32_t>(offset);
-    out.length = static_cast<uint32_t>(length);
+    const std::size_t structureLength = readLe16(data, rom::kPcirLength);
+    if (structureLength < rom::kPcirLengthRevision0 || !fitsIn(offset, structureLength, length))
+        return Flaw{offset + rom::kPcirLength, "the length of the PCI data structure is wrong"};
+    out.dataStructure = static_cast<std::uint32_t>(offset);
+    out.length = static_cast<std::uint32_t>(length);
     return std::nullopt;
 }
 
 /// The fields of the PCI data structure; `data` as for readDeviceList().
 MaybeFlaw readDataStructure(Bytes data, RomImage& out) {
-    out.vendorId = readLe16(data, rom::PCIR_VENDOR);
-    out.deviceId = readLe16(data, rom::PCIR_DEVICE);
-    out.classCode = readLe16(data, rom::PCIR_CLASS) | uint32_t{data[rom::PCIR_CLASS + 2]} << 16;
-    out.codeRevision = readLe16(data, rom::PCIR_CODE_REVISION);
-    out.codeType = data[rom::PCIR_CODE_TYPE];
-    out.last = (data[rom::PCIR_INDICATOR] & rom::LAST_IMAGE) != 0;
-    if (data[rom::PCIR_REVISION] < 3 || readLe16(data, rom::PCIR_LENGTH) < rom::PCIR_LENGTH_REVISION_3)
+    out.vendorId = readLe16(data, rom::kPcirVendor);
+    out.deviceId = readLe16(data, rom::kPcirDevice);
+    out.classCode = readLe16(data, rom::kPcirClass) | std::uint32_t{data[rom::kPcirClass + 2]} << 16;
+    out.codeRevision = readLe16(data, rom::kPcirCodeRevision);
+    out.codeType = data[rom::kPcirCodeType];
+    out.last = (data[rom::kPcirIndicator] & rom::kLastImage) != 0;
+    if (data[rom::kPcirRevision] < 3 || readLe16(data, rom::kPcirLength) < rom::kPcirLengthRevision3)
         return std::nullopt;
-    out.clpEntry = readLe16(data, rom::PCIR_CLP);
+    out.clpEntry = readLe16(data, rom::kPcirClp);
     return readDeviceList(data, out);
 }
 
 MaybeFlaw readCode(Bytes image, RomImage& out) {
-    if (out.codeType == rom::CODE_PC_AT) {
-        const uint8_t sum = sumOfImage(image);
+    if (out.codeType == rom::CodeType::PcAt) {
+        const std::uint8_t sum = rom::sumOfImage(image);
         if (sum != 0)
             return Flaw{0, "the checksum is wrong: the bytes sum to " + std::to_string(sum) + ", not 0"};
         readPnp(image, out);
-    } else if (out.codeType == rom::CODE_EFI) {
-        if (readLe32(image, rom::HEADER_EFI_SIGNATURE) != rom::EFI_SIGNATURE)
-            return Flaw{rom::HEADER_EFI_SIGNATURE, "an EFI image without the EFI signature"};
+    } else if (out.codeType == rom::CodeType::Efi) {
+        if (readLe32(image, rom::kHeaderEfiSignature) != rom::kEfiSignature)
+            return Flaw{rom::kHeaderEfiSignature, "an EFI image without the EFI signature"};
         out.type = utils::FirmwareType::UEFI;
     }
     return std::nullopt;
@@ -154,7 +153,7 @@ MaybeFlaw readImage(Bytes rest, RomImage& out) {
 
 }  // namespace
 
-bool RomImage::fits(uint16_t vendor, uint16_t device) const {
+bool RomImage::fits(std::uint16_t vendor, std::uint16_t device) const {
     return vendorId == vendor &&
            (deviceId == device ||
             std::find(furtherDeviceIds.begin(), furtherDeviceIds.end(), device) != furtherDeviceIds.end());
@@ -167,9 +166,9 @@ bool RomImage::carries(utils::FirmwareType wanted) const {
 
 std::vector<utils::FirmwareVersionInfo> RomFile::components() const {
     std::vector<utils::FirmwareVersionInfo> found;
-    for (std::size_t index = 1; index < TYPE_NAMES.size(); ++index) {
+    for (std::size_t index = 1; index < kTypeNames.size(); ++index) {
         const auto type = static_cast<utils::FirmwareType>(index);
-        std::optional<uint16_t> highest;
+        std::optional<std::uint16_t> highest;
         for (const RomImage& image : images)
             if (image.carries(type)) highest = std::max(highest.value_or(0), image.codeRevision);
         if (highest) found.push_back({type, *highest});
@@ -177,18 +176,18 @@ std::vector<utils::FirmwareVersionInfo> RomFile::components() const {
     return found;
 }
 
-RomFile parseOptionRom(std::span<const uint8_t> file) {
+RomFile parseOptionRom(std::span<const std::uint8_t> file) {
     RomFile result;
     std::size_t offset = 0;
     for (bool last = false; !last;) {
         const std::size_t number = result.images.size();
         RomImage image;
-        image.offset = static_cast<uint32_t>(offset);
+        image.offset = static_cast<std::uint32_t>(offset);
         MaybeFlaw flaw;
         if (file.empty())
             flaw = Flaw{0, "the file is empty"};
-        else if (number == rom::MAX_IMAGES)
-            flaw = Flaw{0, "more than " + std::to_string(rom::MAX_IMAGES) + " images"};
+        else if (number == rom::kMaxImages)
+            flaw = Flaw{0, "more than " + std::to_string(rom::kMaxImages) + " images"};
         else if (offset == file.size())
             flaw = Flaw{0, "the file ends before the image that has the last-image bit: it is cut short"};
         else
@@ -204,12 +203,12 @@ RomFile parseOptionRom(std::span<const uint8_t> file) {
     return result;
 }
 
-std::span<const uint8_t> imageBytes(std::span<const uint8_t> file, const RomImage& image) {
+std::span<const std::uint8_t> imageBytes(std::span<const std::uint8_t> file, const RomImage& image) {
     return fitsIn(image.offset, image.length, file.size()) ? file.subspan(image.offset, image.length)
-                                                           : std::span<const uint8_t>{};
+                                                           : std::span<const std::uint8_t>{};
 }
 
-std::string formatIds(uint16_t vendor, uint16_t device) {
+std::string formatIds(std::uint16_t vendor, std::uint16_t device) {
     char text[10];
     std::snprintf(text, sizeof text, "%04" PRIx16 ":%04" PRIx16, vendor, device);
     return text;
@@ -217,13 +216,13 @@ std::string formatIds(uint16_t vendor, uint16_t device) {
 
 std::string_view firmwareTypeName(utils::FirmwareType type) {
     const auto index = static_cast<std::size_t>(type);  // a negative value becomes a large one
-    return index < TYPE_NAMES.size() ? TYPE_NAMES[index] : std::string_view{};
+    return index < kTypeNames.size() ? kTypeNames[index] : std::string_view{};
 }
 
 std::optional<utils::FirmwareType> firmwareTypeFromName(std::string_view name) {
-    const auto found = std::find(TYPE_NAMES.begin() + 1, TYPE_NAMES.end(), name);
-    if (found == TYPE_NAMES.end()) return std::nullopt;
-    return static_cast<utils::FirmwareType>(found - TYPE_NAMES.begin());
+    const auto found = std::find(kTypeNames.begin() + 1, kTypeNames.end(), name);
+    if (found == kTypeNames.end()) return std::nullopt;
+    return static_cast<utils::FirmwareType>(found - kTypeNames.begin());
 }
 
 }  // namespace ma

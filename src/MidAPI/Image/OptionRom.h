@@ -7,7 +7,7 @@
 #include <string>
 #include <vector>
 
-#include "MidAPI/Image/RomLayout.h"
+#include "MidAPI/Image/RomFormat.h"
 #include "Utils/Export.h"
 #include "Utils/FirmwareTypes.h"
 
@@ -18,18 +18,18 @@ namespace ma {
 
 /// One image of a chain, as its header and its PCI data structure describe it.
 struct QUENX_EXPORT RomImage {
-    uint32_t offset = 0;         ///< from the start of the file, bytes
-    uint32_t length = 0;         ///< bytes, a multiple of 512
-    uint32_t dataStructure = 0;  ///< offset of the PCI data structure from the start of the image, bytes
-    uint16_t vendorId = 0;
-    uint16_t deviceId = 0;
-    std::vector<uint16_t>
-        furtherDeviceIds;  ///< of the same vendor; only data structures of revision 3 have them
-    uint8_t codeType = 0;  ///< one of RomCodeType, or a value not known here
-    uint16_t codeRevision = 0;
-    uint32_t classCode = 0;  ///< 24 bits: base class, subclass, programming interface
+    std::uint32_t offset = 0;         ///< from the start of the file, bytes
+    std::uint32_t length = 0;         ///< bytes, a multiple of 512
+    std::uint32_t dataStructure = 0;  ///< offset of the PCI data structure from the start of the image, bytes
+    std::uint16_t vendorId = 0;
+    std::uint16_t deviceId = 0;
+    std::vector<std::uint16_t>
+        furtherDeviceIds;       ///< of the same vendor; only data structures of revision 3 have them
+    std::uint8_t codeType = 0;  ///< one of RomCodeType, or a value not known here
+    std::uint16_t codeRevision = 0;
+    std::uint32_t classCode = 0;  ///< 24 bits: base class, subclass, programming interface
     bool last = false;
-    uint16_t clpEntry = 0;  ///< offset of the DMTF CLP entry point, 0 for none
+    std::uint16_t clpEntry = 0;  ///< offset of the DMTF CLP entry point, 0 for none
     std::string
         manufacturer;     ///< from the Plug and Play expansion headers; printable, at most 255 characters
     std::string product;  ///< likewise; where a chain of headers names several, the one that tells the type
@@ -41,9 +41,9 @@ struct QUENX_EXPORT RomImage {
     /// An image with a CLP entry point counts as IMG_CLP too, with the same revision and the same fate:
     /// choosing either type chooses the image.
     bool isClp() const { return clpEntry != 0; }
-    bool isNetwork() const { return (classCode >> 16) == rom::NETWORK_BASE_CLASS; }
+    bool isNetwork() const { return (classCode >> 16) == rom::kNetworkBaseClass; }
     /// True when the image was made for this device.
-    bool fits(uint16_t vendor, uint16_t device) const;
+    bool fits(std::uint16_t vendor, std::uint16_t device) const;
     /// True when the image is of this type, IMG_CLP included.
     bool carries(utils::FirmwareType wanted) const;
 };
@@ -59,14 +59,15 @@ struct QUENX_EXPORT RomFile {
 };
 
 /// Reads a chain. Never reads outside `file`, whatever the bytes. What follows the last image is ignored.
-/// Checksums of code type 0 images are verified; more than rom::MAX_IMAGES images are an error.
-QUENX_EXPORT RomFile parseOptionRom(std::span<const uint8_t> file);
+/// Checksums of code type 0 images are verified; more than rom::kMaxImages images are an error.
+QUENX_EXPORT RomFile parseOptionRom(std::span<const std::uint8_t> file);
 
 /// The bytes of one image of a parsed file.
-QUENX_EXPORT std::span<const uint8_t> imageBytes(std::span<const uint8_t> file, const RomImage& image);
+QUENX_EXPORT std::span<const std::uint8_t> imageBytes(std::span<const std::uint8_t> file,
+                                                      const RomImage& image);
 
 /// "1af4:1041": ids as they are usually written.
-QUENX_EXPORT std::string formatIds(uint16_t vendor, uint16_t device);
+QUENX_EXPORT std::string formatIds(std::uint16_t vendor, std::uint16_t device);
 
 /// Name of a type as clients write it ("IMG_PXE"); empty for type 0 and for what is no type.
 QUENX_EXPORT std::string_view firmwareTypeName(utils::FirmwareType type);

@@ -3,43 +3,42 @@
 #include <algorithm>
 #include <string_view>
 
-#include "MidAPI/Image/ByteView.h"
-#include "MidAPI/Image/RomChecksum.h"
+#include "MidAPI/Image/RomFormat.h"
 
 namespace ma {
 namespace {
 
 // Where a made image has its parts.
-constexpr std::size_t MADE_DATA_STRUCTURE = rom::HEADER_LENGTH;
-constexpr std::size_t MADE_PNP = 0x40;
-constexpr std::size_t MADE_MANUFACTURER = 0x60;
-constexpr std::size_t MADE_PRODUCT = 0x70;
-constexpr std::size_t MADE_CODE = 0x100;
-constexpr std::size_t MADE_DEVICE_LIST = 0x110;
-constexpr std::size_t MOST_DEVICE_IDS = 64;
-constexpr uint8_t FAR_RETURN = 0xCB;
-constexpr uint16_t EFI_BOOT_SERVICE_DRIVER = 11;
-constexpr uint16_t EFI_MACHINE_X86_64 = 0x8664;
+constexpr std::size_t kMadeDataStructure = rom::kHeaderLength;
+constexpr std::size_t kMadePnp = 0x40;
+constexpr std::size_t kMadeManufacturer = 0x60;
+constexpr std::size_t kMadeProduct = 0x70;
+constexpr std::size_t kMadeCode = 0x100;
+constexpr std::size_t kMadeDeviceList = 0x110;
+constexpr std::size_t kMostDeviceIds = 64;
+constexpr std::uint8_t kFarReturn = 0xCB;
+constexpr std::uint16_t kEfiBootServiceDriver = 11;
+constexpr std::uint16_t kEfiMachineX8664 = 0x8664;
 
-void mendChecksum(std::span<uint8_t> image, uint8_t wrongBy) {
-    image[rom::HEADER_CHECKSUM] = static_cast<uint8_t>(image[rom::HEADER_CHECKSUM] - wrongBy);
+void mendChecksum(std::span<std::uint8_t> image, std::uint8_t wrongBy) {
+    image[rom::kHeaderChecksum] = static_cast<std::uint8_t>(image[rom::kHeaderChecksum] - wrongBy);
 }
 
 /// Writes a byte of an image; the sum of a code type 0 image stays what it was.
-void patch(std::span<uint8_t> image, bool hasChecksum, std::size_t offset, uint8_t value) {
-    const auto change = static_cast<uint8_t>(value - image[offset]);
+void patch(std::span<std::uint8_t> image, bool hasChecksum, std::size_t offset, std::uint8_t value) {
+    const auto change = static_cast<std::uint8_t>(value - image[offset]);
     image[offset] = value;
     if (hasChecksum) mendChecksum(image, change);
 }
 
-void setLastBit(std::span<uint8_t> image, bool last) {
-    const std::size_t data = readLe16(image, rom::HEADER_DATA_STRUCTURE);
-    const uint8_t old = image[data + rom::PCIR_INDICATOR];
-    const auto wanted = static_cast<uint8_t>(last ? old | rom::LAST_IMAGE : old & ~rom::LAST_IMAGE);
-    patch(image, image[data + rom::PCIR_CODE_TYPE] == rom::CODE_PC_AT, data + rom::PCIR_INDICATOR, wanted);
+void setLastBit(std::span<std::uint8_t> image, bool last) {
+    const std::size_t data = readLe16(image, rom::kHeaderDataStructure);
+    const std::uint8_t old = image[data + rom::kPcirIndicator];
+    const auto wanted = static_cast<std::uint8_t>(last ? old | rom::kLastImage : old & ~rom::kLastImage);
+    patch(image, image[data + rom::kPcirCodeType] == rom::CodeType::PcAt, data + rom::kPcirIndicator, wanted);
 }
 
-void putText(std::span<uint8_t> image, std::size_t offset, std::string_view text) {
+void putText(std::span<std::uint8_t> image, std::size_t offset, std::string_view text) {
     std::copy(text.begin(), text.end(), image.begin() + static_cast<std::ptrdiff_t>(offset));
 }
 
@@ -49,57 +48,58 @@ std::string_view productName(utils::FirmwareType type) {
     return "Simulated PXE boot";
 }
 
-void putDataStructure(std::span<uint8_t> image, const NewRomImage& wanted, bool efi) {
-    const std::span<uint8_t> data = image.subspan(MADE_DATA_STRUCTURE);
+void putDataStructure(std::span<std::uint8_t> image, const NewRomImage& wanted, bool efi) {
+    const std::span<std::uint8_t> data = image.subspan(kMadeDataStructure);
     putText(data, 0, "PCIR");
-    writeLe16(data, rom::PCIR_VENDOR, wanted.vendorId);
-    writeLe16(data, rom::PCIR_DEVICE, wanted.deviceId);
-    writeLe16(data, rom::PCIR_LENGTH, rom::PCIR_LENGTH_REVISION_3);
-    data[rom::PCIR_REVISION] = 3;
-    writeLe16(data, rom::PCIR_CLASS, static_cast<uint16_t>(wanted.classCode & 0xFFFF));
-    data[rom::PCIR_CLASS + 2] = static_cast<uint8_t>(wanted.classCode >> 16 & 0xFF);
-    writeLe16(data, rom::PCIR_IMAGE_UNITS, static_cast<uint16_t>(image.size() / rom::UNIT));
-    writeLe16(data, rom::PCIR_CODE_REVISION, wanted.codeRevision);
-    data[rom::PCIR_CODE_TYPE] = efi ? rom::CODE_EFI : rom::CODE_PC_AT;
-    data[rom::PCIR_INDICATOR] = rom::LAST_IMAGE;
+    writeLe16(data, rom::kPcirVendor, wanted.vendorId);
+    writeLe16(data, rom::kPcirDevice, wanted.deviceId);
+    writeLe16(data, rom::kPcirLength, rom::kPcirLengthRevision3);
+    data[rom::kPcirRevision] = 3;
+    writeLe16(data, rom::kPcirClass, static_cast<std::uint16_t>(wanted.classCode & 0xFFFF));
+    data[rom::kPcirClass + 2] = static_cast<std::uint8_t>(wanted.classCode >> 16 & 0xFF);
+    writeLe16(data, rom::kPcirImageUnits, static_cast<std::uint16_t>(image.size() / rom::kBlockSize));
+    writeLe16(data, rom::kPcirCodeRevision, wanted.codeRevision);
+    data[rom::kPcirCodeType] = efi ? rom::CodeType::Efi : rom::CodeType::PcAt;
+    data[rom::kPcirIndicator] = rom::kLastImage;
     if (!efi && (wanted.clp || wanted.type == utils::FirmwareType::CLP))
-        writeLe16(data, rom::PCIR_CLP, MADE_CODE);
+        writeLe16(data, rom::kPcirClp, kMadeCode);
     if (wanted.furtherDeviceIds.empty()) return;
-    writeLe16(data, rom::PCIR_DEVICE_LIST, MADE_DEVICE_LIST - MADE_DATA_STRUCTURE);
-    const std::size_t count = std::min(wanted.furtherDeviceIds.size(), MOST_DEVICE_IDS);
+    writeLe16(data, rom::kPcirDeviceList, kMadeDeviceList - kMadeDataStructure);
+    const std::size_t count = std::min(wanted.furtherDeviceIds.size(), kMostDeviceIds);
     for (std::size_t index = 0; index < count; ++index)
-        writeLe16(image, MADE_DEVICE_LIST + 2 * index, wanted.furtherDeviceIds[index]);
+        writeLe16(image, kMadeDeviceList + 2 * index, wanted.furtherDeviceIds[index]);
 }
 
-void putEfiHeader(std::span<uint8_t> image) {
-    writeLe16(image, rom::HEADER_RUNTIME_UNITS, static_cast<uint16_t>(image.size() / rom::UNIT));
-    writeLe32(image, rom::HEADER_EFI_SIGNATURE, rom::EFI_SIGNATURE);
-    writeLe16(image, rom::HEADER_EFI_SUBSYSTEM, EFI_BOOT_SERVICE_DRIVER);
-    writeLe16(image, rom::HEADER_EFI_MACHINE, EFI_MACHINE_X86_64);
-    writeLe16(image, rom::HEADER_EFI_IMAGE, MADE_CODE);
+void putEfiHeader(std::span<std::uint8_t> image) {
+    writeLe16(image, rom::kHeaderRuntimeUnits, static_cast<std::uint16_t>(image.size() / rom::kBlockSize));
+    writeLe32(image, rom::kHeaderEfiSignature, rom::kEfiSignature);
+    writeLe16(image, rom::kHeaderEfiSubsystem, kEfiBootServiceDriver);
+    writeLe16(image, rom::kHeaderEfiMachine, kEfiMachineX8664);
+    writeLe16(image, rom::kHeaderEfiImage, kMadeCode);
 }
 
-void putPcAtHeader(std::span<uint8_t> image, utils::FirmwareType type) {
-    image[rom::HEADER_RUNTIME_UNITS] =
-        static_cast<uint8_t>(std::min<std::size_t>(image.size() / rom::UNIT, 0xFF));
-    image[rom::HEADER_ENTRY] = FAR_RETURN;
-    writeLe16(image, rom::HEADER_PNP, MADE_PNP);
-    const std::span<uint8_t> pnp = image.subspan(MADE_PNP, rom::PNP_LENGTH);
+void putPcAtHeader(std::span<std::uint8_t> image, utils::FirmwareType type) {
+    image[rom::kHeaderRuntimeUnits] =
+        static_cast<std::uint8_t>(std::min<std::size_t>(image.size() / rom::kBlockSize, 0xFF));
+    image[rom::kHeaderEntry] = kFarReturn;
+    writeLe16(image, rom::kHeaderPnp, kMadePnp);
+    const std::span<std::uint8_t> pnp = image.subspan(kMadePnp, rom::kPnpLength);
     putText(pnp, 0, "$PnP");
-    writeLe16(pnp, rom::PNP_MANUFACTURER, MADE_MANUFACTURER);
-    writeLe16(pnp, rom::PNP_PRODUCT, MADE_PRODUCT);
-    putText(image, MADE_MANUFACTURER, "Simulator");
-    putText(image, MADE_PRODUCT, productName(type));
+    writeLe16(pnp, rom::kPnpManufacturer, kMadeManufacturer);
+    writeLe16(pnp, rom::kPnpProduct, kMadeProduct);
+    putText(image, kMadeManufacturer, "Simulator");
+    putText(image, kMadeProduct, productName(type));
 }
 
 }  // namespace
 
-std::size_t composeOptionRom(std::span<const std::span<const uint8_t>> images, std::span<uint8_t> output) {
+std::size_t composeOptionRom(std::span<const std::span<const std::uint8_t>> images,
+                             std::span<std::uint8_t> output) {
     std::size_t length = 0;
     for (std::size_t index = 0; index < images.size(); ++index) {
-        const std::span<const uint8_t> source = images[index];
+        const std::span<const std::uint8_t> source = images[index];
         if (!fitsIn(length, source.size(), output.size())) break;
-        const std::span<uint8_t> target = output.subspan(length, source.size());
+        const std::span<std::uint8_t> target = output.subspan(length, source.size());
         std::copy(source.begin(), source.end(), target.begin());
         setLastBit(target, index + 1 == images.size());
         length += source.size();
@@ -107,9 +107,10 @@ std::size_t composeOptionRom(std::span<const std::span<const uint8_t>> images, s
     return length;
 }
 
-std::vector<uint8_t> mergeOptionRoms(std::span<const uint8_t> base, std::span<const uint8_t> update) {
+std::vector<std::uint8_t> mergeOptionRoms(std::span<const std::uint8_t> base,
+                                          std::span<const std::uint8_t> update) {
     const RomFile incoming = parseOptionRom(update);
-    std::vector<std::span<const uint8_t>> images;
+    std::vector<std::span<const std::uint8_t>> images;
     std::vector<bool> taken(incoming.images.size());
     const auto take = [&](utils::FirmwareType type) {
         bool found = false;
@@ -128,35 +129,36 @@ std::vector<uint8_t> mergeOptionRoms(std::span<const uint8_t> base, std::span<co
         take(image.type);
 
     std::size_t length = 0;
-    for (const std::span<const uint8_t>& image : images)
+    for (const std::span<const std::uint8_t>& image : images)
         length += image.size();
-    std::vector<uint8_t> merged(length);
+    std::vector<std::uint8_t> merged(length);
     composeOptionRom(images, merged);
     return merged;
 }
 
-void setCodeRevision(std::span<uint8_t> file, const RomImage& image, uint16_t revision) {
+void setCodeRevision(std::span<std::uint8_t> file, const RomImage& image, std::uint16_t revision) {
     if (!fitsIn(image.offset, image.length, file.size())) return;
-    const std::span<uint8_t> bytes = file.subspan(image.offset, image.length);
-    const std::size_t field = image.dataStructure + rom::PCIR_CODE_REVISION;
-    const bool hasChecksum = image.codeType == rom::CODE_PC_AT;
-    patch(bytes, hasChecksum, field, static_cast<uint8_t>(revision & 0xFF));
-    patch(bytes, hasChecksum, field + 1, static_cast<uint8_t>(revision >> 8));
+    const std::span<std::uint8_t> bytes = file.subspan(image.offset, image.length);
+    const std::size_t field = image.dataStructure + rom::kPcirCodeRevision;
+    const bool hasChecksum = image.codeType == rom::CodeType::PcAt;
+    patch(bytes, hasChecksum, field, static_cast<std::uint8_t>(revision & 0xFF));
+    patch(bytes, hasChecksum, field + 1, static_cast<std::uint8_t>(revision >> 8));
 }
 
-std::vector<uint8_t> makeRomImage(const NewRomImage& wanted) {
-    const std::size_t units = std::clamp<std::size_t>((wanted.length + rom::UNIT - 1) / rom::UNIT, 1, 0xFFFF);
-    std::vector<uint8_t> image(units * rom::UNIT);
+std::vector<std::uint8_t> makeRomImage(const NewRomImage& wanted) {
+    const std::size_t units =
+        std::clamp<std::size_t>((wanted.length + rom::kBlockSize - 1) / rom::kBlockSize, 1, 0xFFFF);
+    std::vector<std::uint8_t> image(units * rom::kBlockSize);
     const bool efi = wanted.type == utils::FirmwareType::UEFI;
-    writeLe16(image, 0, rom::SIGNATURE);
-    writeLe16(image, rom::HEADER_DATA_STRUCTURE, MADE_DATA_STRUCTURE);
-    image[MADE_CODE] = FAR_RETURN;
+    writeLe16(image, 0, rom::kSignature);
+    writeLe16(image, rom::kHeaderDataStructure, kMadeDataStructure);
+    image[kMadeCode] = kFarReturn;
     putDataStructure(image, wanted, efi);
     if (efi)
         putEfiHeader(image);
     else
         putPcAtHeader(image, wanted.type);
-    if (!efi) mendChecksum(image, sumOfImage(image));
+    if (!efi) mendChecksum(image, rom::sumOfImage(image));
     return image;
 }
 

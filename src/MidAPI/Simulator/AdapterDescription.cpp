@@ -4,37 +4,39 @@
 #include <charconv>
 #include <filesystem>
 #include <limits>
+#include <system_error>
 
-#include "MidAPI/AdapterError.h"
+#include "MidAPI/AdapterTypes.h"
 #include "MidAPI/Image/OptionRom.h"
-#include "MidAPI/Simulator/FlashFiles.h"
-#include "MidAPI/Simulator/TomlTable.h"
-#include "MidAPI/Simulator/WholeFile.h"
+#include "MidAPI/Toml.h"
+#include "Utils/Os/Linux/linux.h"
+#include "Utils/Utils.h"
 
 namespace ma {
 namespace {
 
-constexpr std::size_t LONGEST_NAME = 64;
-constexpr uint64_t LONGEST_STALL = 600'000;  // ten minutes, in milliseconds
+constexpr std::size_t kLongestName = 64;
+constexpr std::uint64_t kLongestStall = 600'000;  // ten minutes, in milliseconds
 
-constexpr std::array<std::string_view, 14> ADAPTER_KEYS = {
+constexpr std::array<std::string_view, 14> kAdapterKeys = {
     "name", "description", "pci_address", "pci_id",    "subsystem_id", "mac",        "speed",
     "link", "updatable",   "write_speed", "boot_type", "flash_file",   "components", "fault"};
-constexpr std::array<std::string_view, 2> COMPONENT_KEYS = {"type", "revision"};
-constexpr std::array<std::string_view, 7> FAULT_KEYS = {"at",   "action",       "percent", "code",
+constexpr std::array<std::string_view, 2> kComponentKeys = {"type", "revision"};
+constexpr std::array<std::string_view, 7> kFaultKeys = {"at",   "action",       "percent", "code",
                                                         "text", "milliseconds", "once"};
-constexpr std::array<std::string_view, 1> TOP_KEYS = {"adapter"};
-constexpr std::array<std::string_view, 5> COMPONENT_TYPES = {"IMG_CLP", "IMG_iSCSI", "IMG_PXE", "IMG_UEFI",
+constexpr std::array<std::string_view, 1> kTopKeys = {"adapter"};
+constexpr std::array<std::string_view, 5> kComponentTypes = {"IMG_CLP", "IMG_iSCSI", "IMG_PXE", "IMG_UEFI",
                                                              "IMG_FCoE"};
-constexpr std::array<std::string_view, 5> BOOT_TYPES = {"none", "pxe", "iscsi", "fcoe", "uefi"};
+constexpr std::array<std::string_view, 5> kBootTypes = {"none", "pxe", "iscsi", "fcoe", "uefi"};
 // In the order of Operation and of Fault::Action.
-constexpr std::array<std::string_view, 8> OPERATIONS = {"enumerate", "pci-address", "firmware-version",
-                                                        "prepare",   "write",       "capability-word",
-                                                        "boot-type", "info"};
-constexpr std::array<std::string_view, 5> ACTIONS = {"fail", "throw", "stall", "power-loss", "kill"};
+constexpr std::array<std::string_view, 8> kOperations = {"enumerate", "pci-address", "firmware-version",
+                                                         "prepare",   "write",       "capability-word",
+                                                         "boot-type", "info"};
+constexpr std::array<std::string_view, 5> kActions = {"fail", "throw", "stall", "power-loss", "kill"};
 
 /// Takes hexadecimal digits and then the separator (none when it is NUL) off the front of a text.
-bool takeHex(std::string_view& text, std::size_t fewest, std::size_t most, char separator, uint32_t& value) {
+bool takeHex(std::string_view& text, std::size_t fewest, std::size_t most, char separator,
+             std::uint32_t& value) {
     const char* end = text.data() + std::min(most, text.size());
     const auto result = std::from_chars(text.data(), end, value, 16);
     const auto count = static_cast<std::size_t>(result.ptr - text.data());
@@ -46,28 +48,25 @@ bool takeHex(std::string_view& text, std::size_t fewest, std::size_t most, char 
     return true;
 }
 
-bool parseIds(std::string_view text, uint16_t& vendor, uint16_t& device) {
-    uint32_t first = 0;
-    uint32_t second = 0;
+bool parseIds(std::string_view text, std::uint16_t& vendor, std::uint16_t& device) {
+    std::uint32_t first = 0;
+    std::uint32_t second = 0;
     if (!takeHex(text, 4, 4, ':', first) || !takeHex(text, 4, 4, '\0', second)) return false;
-    vendor = static_cast<uint16_t>(first);
-    device = static_cast<uint16_t>(second);
+    vendor = static_cast<std::uint16_t>(first);
+    device = static_cast<std::uint16_t>(second);
     return true;
 }
 
 /// "0000:03:00.0"; the domain may be left out, and so may the function.
 bool parseAddress(std::string_view text, utils::PCIAddr& address) {
-    constexpr uint32_t HIGHEST_DEVICE = 31;
-    constexpr uint32_t HIGHEST_FUNCTION = 7;
+    constexpr std::uint32_t kHighestDevice = 31;
+    constexpr std::uint32_t kHighestFunction = 7;
     // One spelling for one place: ports are told apart by this text, too.
-    address.text.resize(text.size());
-    std::transform(text.begin(), text.end(), address.text.begin(), [](char character) {
-        return character >= 'A' && character <= 'F' ? static_cast<char>(character - 'A' + 'a') : character;
-    });
-    uint32_t domain = 0;
-    uint32_t bus = 0;
-    uint32_t device = 0;
-    uint32_t function = 0;
+    address.text = utils::lowerCase(text);
+    std::uint32_t domain = 0;
+    std::uint32_t bus = 0;
+    std::uint32_t device = 0;
+    std::uint32_t function = 0;
     if (std::count(text.begin(), text.end(), ':') == 2) {
         if (!takeHex(text, 4, 4, ':', domain)) return false;
     } else {
@@ -77,52 +76,48 @@ bool parseAddress(std::string_view text, utils::PCIAddr& address) {
     if (!takeHex(text, 2, 2, ':', bus) || !takeHex(text, 2, 2, address.noFunction ? '\0' : '.', device))
         return false;
     if (!address.noFunction && !takeHex(text, 1, 1, '\0', function)) return false;
-    address.bus = static_cast<uint8_t>(bus);
-    address.device = static_cast<uint8_t>(device);
-    address.function = static_cast<uint8_t>(function);
-    return device <= HIGHEST_DEVICE && function <= HIGHEST_FUNCTION;
+    address.bus = static_cast<std::uint8_t>(bus);
+    address.device = static_cast<std::uint8_t>(device);
+    address.function = static_cast<std::uint8_t>(function);
+    return device <= kHighestDevice && function <= kHighestFunction;
 }
 
-bool parseMac(std::string_view text, std::array<uint8_t, 6>& mac) {
+bool parseMac(std::string_view text, std::array<std::uint8_t, 6>& mac) {
     for (std::size_t index = 0; index < mac.size(); ++index) {
-        uint32_t value = 0;
+        std::uint32_t value = 0;
         if (!takeHex(text, 2, 2, index + 1 == mac.size() ? '\0' : ':', value)) return false;
-        mac[index] = static_cast<uint8_t>(value);
+        mac[index] = static_cast<std::uint8_t>(value);
     }
     return true;
 }
 
 /// Names are printed, logged and made part of object paths: anything printable, but no control character.
 bool isGoodName(std::string_view name) {
-    return !name.empty() && name.size() <= LONGEST_NAME &&
-           std::none_of(name.begin(), name.end(), [](char character) {
-               return static_cast<unsigned char>(character) < 0x20 || character == 0x7F;
-           });
+    return !name.empty() && name.size() <= kLongestName &&
+           std::none_of(name.begin(), name.end(), utils::isControl);
 }
 
 utils::FirmwareVersionInfo readComponent(const TomlTable& table) {
-    table.allowOnly(COMPONENT_KEYS);
-    const std::optional<std::size_t> type = table.choice("type", COMPONENT_TYPES);
-    if (!type) table.fail("type", "\"type\" is missing; it must be " + listOf(COMPONENT_TYPES));
-    const uint64_t revision = table.number("revision", std::numeric_limits<uint16_t>::max()).value_or(1);
-    return {static_cast<utils::FirmwareType>(*type + 1), static_cast<uint32_t>(revision)};
+    table.allowOnly(kComponentKeys);
+    const std::size_t type = table.requiredChoice("type", kComponentTypes);
+    const std::uint64_t revision =
+        table.number("revision", std::numeric_limits<std::uint16_t>::max()).value_or(1);
+    return {static_cast<utils::FirmwareType>(type + 1), static_cast<std::uint32_t>(revision)};
 }
 
 Fault readFault(const TomlTable& table) {
-    table.allowOnly(FAULT_KEYS);
-    const std::optional<std::size_t> operation = table.choice("at", OPERATIONS);
-    if (!operation) table.fail("at", "\"at\" is missing; it must be " + listOf(OPERATIONS));
-    const std::optional<std::size_t> action = table.choice("action", ACTIONS);
-    if (!action) table.fail("action", "\"action\" is missing; it must be " + listOf(ACTIONS));
+    table.allowOnly(kFaultKeys);
+    const std::size_t operation = table.requiredChoice("at", kOperations);
+    const std::size_t action = table.requiredChoice("action", kActions);
     Fault fault;
-    fault.at = static_cast<Operation>(*operation);
-    fault.action = static_cast<Fault::Action>(*action);
-    fault.percent = static_cast<uint16_t>(table.number("percent", 100).value_or(0));
-    fault.code =
-        static_cast<uint32_t>(table.number("code", std::numeric_limits<uint32_t>::max()).value_or(6));
-    fault.text = table.text("text").value_or("ordered fault: " + std::string(ACTIONS[*action]) + " at " +
-                                             std::string(OPERATIONS[*operation]));
-    fault.milliseconds = static_cast<uint32_t>(table.number("milliseconds", LONGEST_STALL).value_or(0));
+    fault.at = static_cast<Operation>(operation);
+    fault.action = static_cast<Fault::Action>(action);
+    fault.percent = static_cast<std::uint16_t>(table.number("percent", 100).value_or(0));
+    fault.code = static_cast<std::uint32_t>(
+        table.number("code", std::numeric_limits<std::uint32_t>::max()).value_or(6));
+    fault.text = table.text("text").value_or("ordered fault: " + std::string(kActions[action]) + " at " +
+                                             std::string(kOperations[operation]));
+    fault.milliseconds = static_cast<std::uint32_t>(table.number("milliseconds", kLongestStall).value_or(0));
     fault.once = table.flag("once", false);
     return fault;
 }
@@ -130,22 +125,18 @@ Fault readFault(const TomlTable& table) {
 void readIds(const TomlTable& table, PciIds& ids) {
     const std::string id = table.requiredText("pci_id", "1af4:1041");
     if (!parseIds(id, ids.vendor, ids.device))
-        table.fail("pci_id",
-                   "\"pci_id\" is " + inQuotes(id) + ", it must be like \"1af4:1041\" (vendor:device)");
+        table.refuse("pci_id", id, "like \"1af4:1041\" (vendor:device)");
     const std::string subsystem = table.text("subsystem_id").value_or(id);
     if (!parseIds(subsystem, ids.subsystemVendor, ids.subsystemDevice))
-        table.fail("subsystem_id",
-                   "\"subsystem_id\" is " + inQuotes(subsystem) + ", it must be like \"1af4:1100\"");
+        table.refuse("subsystem_id", subsystem, "like \"1af4:1100\"");
 }
 
 void readPlace(const TomlTable& table, AdapterDescription& adapter) {
     const std::string address = table.requiredText("pci_address", "0000:03:00.0");
     if (!parseAddress(address, adapter.address))
-        table.fail("pci_address", "\"pci_address\" is " + inQuotes(address) +
-                                      ", it must be like \"0000:03:00.0\" (domain:bus:device.function)");
+        table.refuse("pci_address", address, "like \"0000:03:00.0\" (domain:bus:device.function)");
     const std::string mac = table.requiredText("mac", "52:54:00:12:34:56");
-    if (!parseMac(mac, adapter.mac))
-        table.fail("mac", "\"mac\" is " + inQuotes(mac) + ", it must be like \"52:54:00:12:34:56\"");
+    if (!parseMac(mac, adapter.mac)) table.refuse("mac", mac, "like \"52:54:00:12:34:56\"");
 }
 
 AdapterDescription readAdapter(const toml::table& node, const TomlTable& top, std::size_t number) {
@@ -153,19 +144,19 @@ AdapterDescription readAdapter(const toml::table& node, const TomlTable& top, st
     AdapterDescription adapter;
     adapter.name = unnamed.requiredText("name", "eth0");
     if (!isGoodName(adapter.name))
-        unnamed.fail("name", "\"name\" is " + inQuotes(adapter.name) + ", it must be 1 to " +
-                                 std::to_string(LONGEST_NAME) + " bytes without control characters");
+        unnamed.refuse("name", adapter.name,
+                       "1 to " + std::to_string(kLongestName) + " bytes without control characters");
 
     const TomlTable table = top.inner(node, "adapter " + inQuotes(adapter.name));
-    table.allowOnly(ADAPTER_KEYS);
+    table.allowOnly(kAdapterKeys);
     readPlace(table, adapter);
     readIds(table, adapter.ids);
     adapter.description = table.text("description").value_or("");
-    adapter.speed = table.number("speed", std::numeric_limits<int64_t>::max()).value_or(0);
+    adapter.speed = table.number("speed", std::numeric_limits<std::int64_t>::max()).value_or(0);
     adapter.linkUp = table.flag("link", true);
     adapter.canBeUpdated = table.flag("updatable", true);
-    adapter.writeSpeed = table.number("write_speed", std::numeric_limits<int64_t>::max()).value_or(0);
-    adapter.bootType = static_cast<BootType>(table.choice("boot_type", BOOT_TYPES).value_or(0));
+    adapter.writeSpeed = table.number("write_speed", std::numeric_limits<std::int64_t>::max()).value_or(0);
+    adapter.bootType = static_cast<BootType>(table.choice("boot_type", kBootTypes).value_or(0));
     adapter.flashFile = table.text("flash_file").value_or("");
     for (const toml::table* component : table.tables("components"))
         adapter.components.push_back(
@@ -173,6 +164,12 @@ AdapterDescription readAdapter(const toml::table& node, const TomlTable& top, st
     for (const toml::table* fault : table.tables("fault"))
         adapter.faults.push_back(readFault(table.inner(*fault, "a fault of " + inQuotes(adapter.name))));
     return adapter;
+}
+
+std::optional<std::vector<std::uint8_t>> readDescriptionFile(const std::string& path, std::size_t most) try {
+    return os::readWholeFile(path, most);
+} catch (const std::system_error& error) {
+    throw AdapterError(std::string("the adapter description: ") + error.what());
 }
 
 void refuseDoubles(const std::vector<AdapterDescription>& adapters, const TomlTable& top) {
@@ -191,30 +188,25 @@ void refuseDoubles(const std::vector<AdapterDescription>& adapters, const TomlTa
 
 }  // namespace
 
-std::vector<AdapterDescription> parseAdapterDescriptions(std::string_view text, const std::string& fileName) {
-    const toml::parse_result parsed = toml::parse(text);
-    if (!parsed)
-        throw AdapterError(fileName + ", line " + std::to_string(parsed.error().source().begin.line) + ": " +
-                           std::string(parsed.error().description()));
-    const TomlTable top(parsed.table(), fileName, "adapter description");
-    top.allowOnly(TOP_KEYS);
+std::vector<AdapterDescription> parseAdapterDescriptions(std::string_view text,
+                                                         const std::string& fileName) try {
+    const toml::table parsed = parseToml(text);
+    const TomlTable top(parsed, fileName, "adapter description");
+    top.allowOnly(kTopKeys);
     std::vector<AdapterDescription> adapters;
     for (const toml::table* node : top.tables("adapter"))
         adapters.push_back(readAdapter(*node, top, adapters.size() + 1));
     refuseDoubles(adapters, top);
     return adapters;
+} catch (const TomlError& error) {
+    throw AdapterError(fileName + ", line " + std::to_string(error.line()) + ": " + error.what());
 }
 
 std::vector<AdapterDescription> loadAdapterDescriptions(const std::string& path) {
-    constexpr std::size_t MOST_TEXT = std::size_t{4} * 1024 * 1024;
-    std::optional<std::vector<uint8_t>> bytes;
-    try {
-        bytes = readWholeFile(path, MOST_TEXT + 1);
-    } catch (const FlashError& error) {
-        throw AdapterError(std::string("the adapter description: ") + error.what());
-    }
+    constexpr std::size_t kMostText = std::size_t{4} * 1024 * 1024;
+    const auto bytes = readDescriptionFile(path, kMostText + 1);
     if (!bytes) throw AdapterError("there is no adapter description " + path + "; name a readable file");
-    if (bytes->size() > MOST_TEXT)
+    if (bytes->size() > kMostText)
         throw AdapterError("the adapter description " + path + " is longer than 4 MiB");
     std::vector<AdapterDescription> adapters =
         parseAdapterDescriptions(std::string(bytes->begin(), bytes->end()), path);

@@ -19,11 +19,11 @@ struct AdapterDescription {
     std::string description;
     utils::PCIAddr address;
     PciIds ids;
-    std::array<uint8_t, 6> mac{};
-    uint64_t speed = 0;  ///< bits per second
+    std::array<std::uint8_t, 6> mac{};
+    std::uint64_t speed = 0;  ///< bits per second
     bool linkUp = true;
     bool canBeUpdated = true;
-    uint64_t writeSpeed = 0;  ///< bytes per second; 0: as fast as it goes
+    std::uint64_t writeSpeed = 0;  ///< bytes per second; 0: as fast as it goes
     BootType bootType = BootType::None;
     std::string flashFile;  ///< absolute, or relative to the description file; empty for none
     std::vector<utils::FirmwareVersionInfo> components;
@@ -38,10 +38,5 @@ QUENX_EXPORT std::vector<AdapterDescription> parseAdapterDescriptions(std::strin
 
 /// Reads a description file. Relative paths in it are made relative to its folder. Throws AdapterError.
 QUENX_EXPORT std::vector<AdapterDescription> loadAdapterDescriptions(const std::string& path);
-
-/// What is in the flash of an adapter that was never written to: the flash file with the code revisions of
-/// the listed components set, and made images for those components that the file does not have. Throws
-/// AdapterError when the file cannot be read or is no intact ROM image.
-std::vector<uint8_t> makeFactoryFlash(const AdapterDescription& adapter);
 
 }  // namespace ma

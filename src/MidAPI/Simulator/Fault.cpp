@@ -11,7 +11,7 @@ namespace {
 void strike(const Fault& fault) {
     switch (fault.action) {
         case Fault::Action::Fail:
-            throw OrderedFailure{fault.code, fault.text};
+            throw OperationFailure(fault.code, fault.text);
         case Fault::Action::Throw:
             throw AdapterError(fault.text);
         case Fault::Action::PowerLoss:
@@ -61,7 +61,7 @@ bool FaultList::take(const Entry& entry) {
 
 FaultRun::FaultRun(FaultList& list, Operation operation) : m_list(list), m_pending(list.armed(operation)) {}
 
-void FaultRun::reach(unsigned percent) {
+void FaultRun::reach(unsigned int percent) {
     for (std::size_t index = 0; index < m_pending.size();) {
         if (m_pending[index].fault.percent > percent) {
             ++index;

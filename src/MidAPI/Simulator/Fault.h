@@ -1,10 +1,11 @@
 #pragma once
 
 #include <cstdint>
+#include <stdexcept>
 #include <string>
 #include <vector>
 
-#include "MidAPI/AdapterError.h"
+#include "MidAPI/AdapterTypes.h"
 #include "Utils/Export.h"
 #include "Utils/Os/Linux/Mutex.h"
 #include "Utils/ThreadAnnotations.h"
@@ -23,7 +24,7 @@ enum class Operation {
     Info
 };
 
-/// One thing that goes wrong on order.
+/// One thing that shall go wrong.
 struct Fault {
     enum class Action {
         Fail,       ///< the operation reports failure with `code` and `text` (Prepare: `code` is the status)
@@ -35,10 +36,10 @@ struct Fault {
 
     Operation at = Operation::Write;
     Action action = Action::Fail;
-    uint16_t percent = 0;  ///< Write only: strikes when the progress has reached this, 0 to 100
-    uint32_t code = 0;
+    std::uint16_t percent = 0;  ///< Write only: strikes when the progress has reached this, 0 to 100
+    std::uint32_t code = 0;
     std::string text{};
-    uint32_t milliseconds = 0;
+    std::uint32_t milliseconds = 0;
     bool once = false;  ///< strikes one time only, instead of at every such operation
 };
 
@@ -49,10 +50,15 @@ class QUENX_EXPORT PowerLoss : public AdapterError {
     ~PowerLoss() override;
 };
 
-/// How a fault of Action::Fail travels inside the simulator.
-struct OrderedFailure {
-    uint32_t code;
-    std::string text;
+/// An operation failed, because it was refused or because of a fault of Action::Fail: how code and text
+/// travel inside the simulator.
+class OperationFailure : public std::runtime_error {
+  public:
+    OperationFailure(std::uint32_t code, const std::string& text) : std::runtime_error(text), m_code(code) {}
+    std::uint32_t code() const { return m_code; }
+
+  private:
+    std::uint32_t m_code;
 };
 
 /// The faults of one adapter. Thread-safe.
@@ -65,7 +71,7 @@ class FaultList {
 
   private:
     struct Entry {
-        uint64_t id;
+        std::uint64_t id;
         Fault fault;
     };
     friend class FaultRun;
@@ -76,7 +82,7 @@ class FaultList {
 
     utils::Mutex m_mutex;
     std::vector<Entry> m_entries QUENX_GUARDED_BY(m_mutex);
-    uint64_t m_nextId QUENX_GUARDED_BY(m_mutex) = 0;
+    std::uint64_t m_nextId QUENX_GUARDED_BY(m_mutex) = 0;
 };
 
 /// The faults that may strike during one operation, each at most once.
@@ -84,8 +90,8 @@ class FaultRun {
   public:
     FaultRun(FaultList& list, Operation operation);
 
-    /// Lets those strike whose percentage is reached. Throws OrderedFailure, AdapterError or PowerLoss.
-    void reach(unsigned percent = 100);
+    /// Lets those strike whose percentage is reached. Throws OperationFailure, AdapterError or PowerLoss.
+    void reach(unsigned int percent = 100);
 
   private:
     FaultList& m_list;

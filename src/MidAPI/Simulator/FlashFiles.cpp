@@ -13,32 +13,29 @@
 namespace ma {
 namespace {
 
-constexpr mode_t FOLDER_MODE = 0755;
-constexpr mode_t FILE_MODE = 0644;
+constexpr mode_t kFolderMode = 0755;
+constexpr mode_t kFileMode = 0644;
 
 [[noreturn]] void fail(const std::string& what) {
-    throw FlashError(what + ": " + std::generic_category().message(errno));
+    throw std::system_error(errno, std::generic_category(), what);
 }
 
 }  // namespace
 
-FlashError::FlashError(const std::string& text) : std::runtime_error(text) {}
-FlashError::~FlashError() = default;
-
 FlashFiles::~FlashFiles() = default;
 
 void FlashFiles::makeFolder(const std::string& path) {
-    if (::mkdir(path.c_str(), FOLDER_MODE) != 0 && errno != EEXIST) fail("cannot make the folder " + path);
+    if (::mkdir(path.c_str(), kFolderMode) != 0 && errno != EEXIST) fail("cannot make the folder " + path);
 }
 
 int FlashFiles::create(const std::string& path) {
     const int descriptor =
-        ::open(path.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC | O_NOFOLLOW, FILE_MODE);
+        ::open(path.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC | O_NOFOLLOW, kFileMode);
     if (descriptor < 0) fail("cannot write the file " + path);
     return descriptor;
 }
 
-void FlashFiles::write(int descriptor, std::span<const uint8_t> bytes) {
+void FlashFiles::write(int descriptor, std::span<const std::uint8_t> bytes) {
     while (!bytes.empty()) {
         const ssize_t written = ::write(descriptor, bytes.data(), bytes.size());
         if (written < 0 && errno == EINTR) continue;

@@ -2,22 +2,15 @@
 
 #include <cstdint>
 #include <span>
-#include <stdexcept>
 #include <string>
 
 #include "Utils/Export.h"
 
 namespace ma {
 
-/// A file operation of the simulator failed; the text says which and why.
-class QUENX_EXPORT FlashError : public std::runtime_error {
-  public:
-    explicit FlashError(const std::string& text);
-    ~FlashError() override;
-};
-
 /// Every change that the simulator makes to files, one system call each: the seam at which a test cuts the
-/// power. All operations throw FlashError. No state; may be used from any thread.
+/// power. All operations throw std::system_error, which names the file and
+/// the reason. No state; may be used from any thread.
 class QUENX_EXPORT FlashFiles {
   public:
     FlashFiles() = default;
@@ -30,7 +23,7 @@ class QUENX_EXPORT FlashFiles {
     /// Opens an empty file for writing, emptying one that is there; the caller closes the descriptor.
     virtual int create(const std::string& path);
     /// Writes all bytes at the end of what was written so far.
-    virtual void write(int descriptor, std::span<const uint8_t> bytes);
+    virtual void write(int descriptor, std::span<const std::uint8_t> bytes);
     /// Returns when what was written is on the medium.
     virtual void sync(int descriptor);
     virtual void rename(const std::string& from, const std::string& to);
@@ -47,7 +40,7 @@ class FlashFile {
     FlashFile& operator=(const FlashFile&) = delete;
     ~FlashFile();
 
-    void write(std::span<const uint8_t> bytes) { m_files.write(m_descriptor, bytes); }
+    void write(std::span<const std::uint8_t> bytes) { m_files.write(m_descriptor, bytes); }
     void sync() { m_files.sync(m_descriptor); }
 
   private:

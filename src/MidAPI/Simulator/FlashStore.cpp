@@ -3,20 +3,87 @@
 #include <sys/stat.h>
 
 #include <algorithm>
+#include <stdexcept>
+#include <string_view>
 
-#include "MidAPI/Simulator/WholeFile.h"
+#include "MidAPI/Image/RomFormat.h"
 #include "Utils/Log.h"
+#include "Utils/Os/Linux/linux.h"
 
 namespace ma {
 namespace {
 
-constexpr std::size_t CHUNK = 4096;  // a sector of the flash
-constexpr const char* STATE_FILE = "state";
-constexpr const char* NEW_STATE_FILE = "state.new";
+constexpr std::string_view kMagic = "QXFLASH1";
+constexpr std::size_t kGeneration = 8;
+constexpr std::size_t kActiveBank = 12;  // the three bytes behind it are 0
+constexpr std::size_t kBanks = 16;       // two of kBankLength bytes
+constexpr std::size_t kBankLength = 8;
+constexpr std::size_t kBootType = 32;
+constexpr std::size_t kCapabilityWord = 36;
+constexpr std::size_t kChecksum = 40;
+
+constexpr std::array<std::uint32_t, 256> makeCrcTable() {
+    std::array<std::uint32_t, 256> table{};
+    for (std::uint32_t index = 0; index < table.size(); ++index) {
+        std::uint32_t value = index;
+        for (int bit = 0; bit < 8; ++bit)
+            value = value >> 1 ^ (value & 1 ? 0xEDB88320U : 0U);
+        table[index] = value;
+    }
+    return table;
+}
+constexpr std::array<std::uint32_t, 256> kCrcTable = makeCrcTable();
+
+constexpr std::size_t kChunk = 4096;  // a sector of the flash
+constexpr const char* kStateFile = "state";
+constexpr const char* kNewStateFile = "state.new";
 
 }  // namespace
 
-FlashStore::FlashStore(std::string folder, std::vector<uint8_t> factoryFlash, FlashState factoryState,
+std::uint32_t crc32(std::span<const std::uint8_t> bytes) {
+    std::uint32_t value = 0xFFFFFFFFU;
+    for (const std::uint8_t byte : bytes)
+        value = value >> 8 ^ kCrcTable[(value ^ byte) & 0xFF];
+    return ~value;
+}
+
+bool FlashBank::holds(std::span<const std::uint8_t> content) const {
+    return length != 0 && content.size() == length && crc32(content) == checksum;
+}
+
+std::array<std::uint8_t, kFlashStateLength> encodeFlashState(const FlashState& state) {
+    std::array<std::uint8_t, kFlashStateLength> bytes{};
+    std::copy(kMagic.begin(), kMagic.end(), bytes.begin());
+    writeLe32(bytes, kGeneration, state.generation);
+    bytes[kActiveBank] = state.activeBank;
+    for (std::size_t bank = 0; bank < state.banks.size(); ++bank) {
+        writeLe32(bytes, kBanks + bank * kBankLength, state.banks[bank].length);
+        writeLe32(bytes, kBanks + bank * kBankLength + 4, state.banks[bank].checksum);
+    }
+    writeLe32(bytes, kBootType, state.bootType);
+    writeLe32(bytes, kCapabilityWord, state.capabilityWord);
+    writeLe32(bytes, kChecksum, crc32(std::span<const std::uint8_t>(bytes).first(kChecksum)));
+    return bytes;
+}
+
+std::optional<FlashState> decodeFlashState(std::span<const std::uint8_t> bytes) {
+    if (bytes.size() != kFlashStateLength || !std::equal(kMagic.begin(), kMagic.end(), bytes.begin()))
+        return {};
+    if (readLe32(bytes, kChecksum) != crc32(bytes.first(kChecksum))) return {};
+    FlashState state;
+    state.generation = readLe32(bytes, kGeneration);
+    state.activeBank = bytes[kActiveBank];
+    if (state.activeBank > 1) return {};
+    for (std::size_t bank = 0; bank < state.banks.size(); ++bank) {
+        state.banks[bank].length = readLe32(bytes, kBanks + bank * kBankLength);
+        state.banks[bank].checksum = readLe32(bytes, kBanks + bank * kBankLength + 4);
+    }
+    state.bootType = readLe32(bytes, kBootType);
+    state.capabilityWord = readLe32(bytes, kCapabilityWord);
+    return state;
+}
+
+FlashStore::FlashStore(std::string folder, std::vector<std::uint8_t> factoryFlash, FlashState factoryState,
                        std::shared_ptr<FlashFiles> files)
     : m_folder(std::move(folder)),
       m_factoryFlash(std::move(factoryFlash)),
@@ -24,28 +91,29 @@ FlashStore::FlashStore(std::string folder, std::vector<uint8_t> factoryFlash, Fl
       m_files(std::move(files)) {}
 
 std::optional<FlashState> FlashStore::storedState() const {
-    const auto bytes = readWholeFile(path(STATE_FILE), FLASH_STATE_LENGTH + 1);
+    const auto bytes = os::readWholeFile(path(kStateFile), kFlashStateLength + 1);
     if (!bytes) return std::nullopt;
     if (std::optional<FlashState> state = decodeFlashState(*bytes)) return state;
-    throw FlashError("the record " + path(STATE_FILE) + " is damaged; remove the folder " + m_folder +
-                     " to have the adapter as it left the factory");
+    throw std::runtime_error("the record " + path(kStateFile) + " is damaged; remove the folder " + m_folder +
+                             " to have the adapter as it left the factory");
 }
 
 FlashState FlashStore::state() const {
     return storedState().value_or(m_factoryState);
 }
 
-std::optional<std::vector<uint8_t>> FlashStore::bankContent(const FlashState& state, uint8_t bank) const {
+std::optional<std::vector<std::uint8_t>> FlashStore::bankContent(const FlashState& state,
+                                                                 std::uint8_t bank) const {
     const FlashBank& expected = state.banks[bank];
     // The file may be longer: an update that was cut off left it so.
-    auto bytes = readWholeFile(bankPath(bank), expected.length);
+    auto bytes = os::readWholeFile(bankPath(bank), expected.length);
     if (bytes && expected.holds(*bytes)) return bytes;
     return std::nullopt;
 }
 
-std::vector<uint8_t> FlashStore::content() const {
-    constexpr int MOST_TRIES = 8;
-    for (int attempt = 0; attempt < MOST_TRIES; ++attempt) {
+std::vector<std::uint8_t> FlashStore::content() const {
+    constexpr int kMostTries = 8;
+    for (int attempt = 0; attempt < kMostTries; ++attempt) {
         const std::optional<FlashState> state = storedState();
         if (!state) return m_factoryFlash;
         if (state->active().length == 0) return {};
@@ -56,28 +124,28 @@ std::vector<uint8_t> FlashStore::content() const {
         if (auto bytes = bankContent(*state, state->inactiveBank())) return *bytes;
         break;
     }
-    throw FlashError("no bank in " + m_folder +
-                     " is intact; remove the folder to have the adapter as it left the factory");
+    throw std::runtime_error("no bank in " + m_folder +
+                             " is intact; remove the folder to have the adapter as it left the factory");
 }
 
-FileLock FlashStore::lockForWriting() {
+os::FileLock FlashStore::lockForWriting() {
     makeFolders();
-    return FileLock(path("flash.lock"), FileLock::Mode::Try);
+    return os::FileLock(path("flash.lock"), os::FileLock::Mode::Try);
 }
 
-void FlashStore::write(std::span<const uint8_t> image, const std::function<void(std::size_t)>& reached) {
+void FlashStore::write(std::span<const std::uint8_t> image, const std::function<void(std::size_t)>& reached) {
     const FlashState before = initialise();
-    const auto bank = static_cast<uint8_t>(1 - bootedBank(before));
+    const auto bank = static_cast<std::uint8_t>(1 - bootedBank(before));
     writeBank(bank, image, reached);
     changeState([&](FlashState& state) {
-        state.banks[bank] = {static_cast<uint32_t>(image.size()), crc32(image)};
+        state.banks[bank] = {static_cast<std::uint32_t>(image.size()), crc32(image)};
         state.activeBank = bank;
     });
 }
 
 void FlashStore::changeState(const std::function<void(FlashState&)>& change) {
     initialise();
-    const FileLock lock(path("state.lock"), FileLock::Mode::Wait);
+    const os::FileLock lock(path("state.lock"), os::FileLock::Mode::Wait);
     FlashState state = this->state();
     change(state);
     ++state.generation;
@@ -87,18 +155,18 @@ void FlashStore::changeState(const std::function<void(FlashState&)>& change) {
 /// Gives a factory-fresh adapter its files, so that a change has something to change.
 FlashState FlashStore::initialise() {
     makeFolders();
-    const FileLock lock(path("state.lock"), FileLock::Mode::Wait);
+    const os::FileLock lock(path("state.lock"), os::FileLock::Mode::Wait);
     if (std::optional<FlashState> stored = storedState()) return *stored;
     FlashState state = m_factoryState;
     state.activeBank = 0;
     state.banks = {};
-    state.banks[0] = {static_cast<uint32_t>(m_factoryFlash.size()), crc32(m_factoryFlash)};
+    state.banks[0] = {static_cast<std::uint32_t>(m_factoryFlash.size()), crc32(m_factoryFlash)};
     writeBank(0, m_factoryFlash, [](std::size_t) {});
     storeState(state);
     return state;
 }
 
-uint8_t FlashStore::bootedBank(const FlashState& state) const {
+std::uint8_t FlashStore::bootedBank(const FlashState& state) const {
     if (state.active().length == 0 || bankContent(state, state.activeBank)) return state.activeBank;
     return bankContent(state, state.inactiveBank()) ? state.inactiveBank() : state.activeBank;
 }
@@ -118,13 +186,13 @@ void FlashStore::makeFolders() {
     }
 }
 
-void FlashStore::writeBank(uint8_t bank, std::span<const uint8_t> image,
+void FlashStore::writeBank(std::uint8_t bank, std::span<const std::uint8_t> image,
                            const std::function<void(std::size_t)>& reached) {
     reached(0);
     {
         FlashFile file(*m_files, bankPath(bank));
         for (std::size_t written = 0; written < image.size();) {
-            const std::size_t count = std::min(CHUNK, image.size() - written);
+            const std::size_t count = std::min(kChunk, image.size() - written);
             file.write(image.subspan(written, count));
             written += count;
             reached(written);
@@ -137,11 +205,11 @@ void FlashStore::writeBank(uint8_t bank, std::span<const uint8_t> image,
 
 void FlashStore::storeState(FlashState state) {
     {
-        FlashFile file(*m_files, path(NEW_STATE_FILE));
+        FlashFile file(*m_files, path(kNewStateFile));
         file.write(encodeFlashState(state));
         file.sync();
     }
-    m_files->rename(path(NEW_STATE_FILE), path(STATE_FILE));
+    m_files->rename(path(kNewStateFile), path(kStateFile));
     m_files->syncFolder(m_folder);
 }
 

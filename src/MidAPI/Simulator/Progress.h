@@ -1,7 +1,10 @@
 #pragma once
 
 #include <algorithm>
+#include <chrono>
+#include <cstddef>
 #include <cstdint>
+#include <thread>
 
 #include "Utils/Os/Linux/Mutex.h"
 #include "Utils/ThreadAnnotations.h"
@@ -11,7 +14,7 @@ namespace ma {
 /// The percentage of an adapter's update. Thread-safe.
 class Progress {
   public:
-    uint16_t percent() const {
+    std::uint16_t percent() const {
         const utils::Mutex::AutoLocker lock(m_mutex);
         return m_percent;
     }
@@ -28,7 +31,7 @@ class Progress {
         m_percent = 0;
     }
 
-    void advance(uint16_t percent) {
+    void advance(std::uint16_t percent) {
         const utils::Mutex::AutoLocker lock(m_mutex);
         m_percent = std::max(m_percent, percent);
     }
@@ -41,7 +44,37 @@ class Progress {
   private:
     mutable utils::Mutex m_mutex;
     bool m_writing QUENX_GUARDED_BY(m_mutex) = false;
-    uint16_t m_percent QUENX_GUARDED_BY(m_mutex) = 0;
+    std::uint16_t m_percent QUENX_GUARDED_BY(m_mutex) = 0;
+};
+
+/// Holds a writer back to the adapter's speed.
+class Pace {
+  public:
+    explicit Pace(std::uint64_t bytesPerSecond) : m_bytesPerSecond(bytesPerSecond) {}
+
+    void waitFor(std::size_t written) const {
+        if (m_bytesPerSecond == 0) return;
+        const double seconds = static_cast<double>(written) / static_cast<double>(m_bytesPerSecond);
+        std::this_thread::sleep_until(m_begin +
+                                      std::chrono::duration_cast<std::chrono::steady_clock::duration>(
+                                          std::chrono::duration<double>(seconds)));
+    }
+
+  private:
+    const std::uint64_t m_bytesPerSecond;
+    const std::chrono::steady_clock::time_point m_begin = std::chrono::steady_clock::now();
+};
+
+/// Marks the time during which an adapter is being written to, however that ends.
+class WritingScope {
+  public:
+    explicit WritingScope(Progress& progress) : m_progress(progress) { m_progress.begin(); }
+    WritingScope(const WritingScope&) = delete;
+    WritingScope& operator=(const WritingScope&) = delete;
+    ~WritingScope() { m_progress.end(); }
+
+  private:
+    Progress& m_progress;
 };
 
 }  // namespace ma

@@ -2,54 +2,98 @@
 
 #include <unistd.h>
 
-#include <chrono>
-#include <thread>
+#include <stdexcept>
+#include <system_error>
 
 #include "MidAPI/Image/ImagePreparation.h"
 #include "MidAPI/Image/OptionRomWriter.h"
 #include "Utils/Log.h"
+#include "Utils/Os/Linux/linux.h"
+#include "Utils/Utils.h"
 
 namespace ma {
 namespace {
 
-uint32_t bitOf(utils::FirmwareType type) {
-    const auto number = static_cast<uint32_t>(type);
+std::uint32_t bitOf(utils::FirmwareType type) {
+    const auto number = static_cast<std::uint32_t>(type);
     return number >= 1 && number <= 5 ? 1U << number : 0;
 }
 
-uint32_t bitsOf(const std::vector<utils::FirmwareVersionInfo>& components) {
-    uint32_t bits = 0;
+std::uint32_t bitsOf(const std::vector<utils::FirmwareVersionInfo>& components) {
+    std::uint32_t bits = 0;
     for (const utils::FirmwareVersionInfo& component : components)
         bits |= bitOf(component.type);
     return bits;
 }
 
-/// The folder of an adapter: its name with everything that a file name does not like as %xx.
+/// The folder of an adapter: its name, where only letters, digits, _ and - stand for themselves. Names come
+/// from a description; "../x" must not leave the state directory, nor may two names share a folder.
 std::string folderName(const std::string& name) {
-    constexpr std::string_view PLAIN = "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789_-";
-    constexpr std::string_view DIGITS = "0123456789abcdef";
     std::string result;
     for (const char character : name) {
-        if (PLAIN.find(character) != std::string_view::npos) {
+        if (utils::isLetter(character) || utils::isDigit(character) || character == '_' || character == '-')
             result += character;
-            continue;
-        }
-        const auto byte = static_cast<unsigned char>(character);
-        result += {'%', DIGITS[byte >> 4], DIGITS[byte & 0xF]};
+        else
+            result += '%' + utils::hexByte(static_cast<unsigned char>(character));
     }
     return result;
 }
 
-FlashState factoryState(const AdapterDescription& description, std::span<const uint8_t> flash) {
+constexpr std::size_t kMostFlash = std::size_t{64} * 1024 * 1024;
+
+[[noreturn]] void refuseFlashFile(const AdapterDescription& adapter, const std::string& why) {
+    throw AdapterError("adapter " + adapter.name + ": its flash_file " + adapter.flashFile + " " + why);
+}
+
+std::vector<std::uint8_t> readFlashFile(const AdapterDescription& adapter) try {
+    if (adapter.flashFile.empty()) return {};
+    std::optional<std::vector<std::uint8_t>> bytes = os::readWholeFile(adapter.flashFile, kMostFlash + 1);
+    if (!bytes) refuseFlashFile(adapter, "is not there; name an expansion ROM file");
+    if (bytes->size() > kMostFlash) refuseFlashFile(adapter, "is longer than 64 MiB");
+    if (const RomFile rom = parseOptionRom(*bytes); rom.error)
+        refuseFlashFile(adapter, "is not an intact ROM image: " + *rom.error);
+    return *bytes;
+} catch (const std::system_error& error) {
+    refuseFlashFile(adapter, std::string("cannot be used: ") + error.what());
+}
+
+/// Gives every image of a type this code revision; false when there is none.
+bool setRevisions(std::vector<std::uint8_t>& flash, const utils::FirmwareVersionInfo& component) {
+    bool found = false;
+    for (const RomImage& image : parseOptionRom(flash).images) {
+        if (!image.carries(component.type)) continue;
+        setCodeRevision(flash, image, static_cast<std::uint16_t>(component.version));
+        found = true;
+    }
+    return found;
+}
+
+/// What is in the flash of an adapter that was never written to: the flash file with the code revisions of
+/// the listed components set, and made images for those components that the file does not have.
+std::vector<std::uint8_t> makeFactoryFlash(const AdapterDescription& adapter) {
+    std::vector<std::uint8_t> flash = readFlashFile(adapter);
+    for (const utils::FirmwareVersionInfo& component : adapter.components) {
+        if (!flash.empty() && setRevisions(flash, component)) continue;
+        NewRomImage wanted;
+        wanted.type = component.type;
+        wanted.vendorId = adapter.ids.vendor;
+        wanted.deviceId = adapter.ids.device;
+        wanted.codeRevision = static_cast<std::uint16_t>(component.version);
+        flash = mergeOptionRoms(flash, makeRomImage(wanted));
+    }
+    return flash;
+}
+
+FlashState factoryState(const AdapterDescription& description, std::span<const std::uint8_t> flash) {
     FlashState state;
-    state.bootType = static_cast<uint32_t>(description.bootType);
+    state.bootType = static_cast<std::uint32_t>(description.bootType);
     if (!flash.empty()) state.capabilityWord = bitsOf(parseOptionRom(flash).components());
     return state;
 }
 
 FlashStore makeStore(const AdapterDescription& description, const std::string& stateDirectory,
                      std::shared_ptr<FlashFiles> files) {
-    std::vector<uint8_t> flash = makeFactoryFlash(description);
+    std::vector<std::uint8_t> flash = makeFactoryFlash(description);
     const FlashState state = factoryState(description, flash);
     return FlashStore(stateDirectory + "/" + folderName(description.name), std::move(flash), state,
                       std::move(files));
@@ -63,50 +107,20 @@ std::string describeHolder(const std::string& adapter, pid_t holder) {
     return text + "process " + std::to_string(holder) + "; wait until it is done";
 }
 
-/// Holds a writer back to the adapter's speed.
-class Pace {
-  public:
-    explicit Pace(uint64_t bytesPerSecond) : m_bytesPerSecond(bytesPerSecond) {}
-
-    void waitFor(std::size_t written) const {
-        if (m_bytesPerSecond == 0) return;
-        const double seconds = static_cast<double>(written) / static_cast<double>(m_bytesPerSecond);
-        std::this_thread::sleep_until(m_begin +
-                                      std::chrono::duration_cast<std::chrono::steady_clock::duration>(
-                                          std::chrono::duration<double>(seconds)));
-    }
-
-  private:
-    const uint64_t m_bytesPerSecond;
-    const std::chrono::steady_clock::time_point m_begin = std::chrono::steady_clock::now();
-};
-
-/// Marks the time during which an adapter is being written to, however that ends.
-class WritingScope {
-  public:
-    explicit WritingScope(Progress& progress) : m_progress(progress) { m_progress.begin(); }
-    WritingScope(const WritingScope&) = delete;
-    WritingScope& operator=(const WritingScope&) = delete;
-    ~WritingScope() { m_progress.end(); }
-
-  private:
-    Progress& m_progress;
-};
-
 /// Runs an operation and turns what it throws into the API's code and text. A power loss and an ordered
 /// exception pass through.
 template <typename Action>
-bool report(const std::string& adapter, uint32_t& errorCode, std::string& errorText, Action action) {
-    errorCode = NO_ERROR;
+bool report(const std::string& adapter, std::uint32_t& errorCode, std::string& errorText, Action action) {
+    errorCode = WriteError::NoError;
     errorText.clear();
     try {
         action();
         return true;
-    } catch (const OrderedFailure& failure) {
-        errorCode = failure.code;
-        errorText = failure.text;
-    } catch (const FlashError& error) {
-        errorCode = ERROR_DEVICE;
+    } catch (const OperationFailure& failure) {
+        errorCode = failure.code();
+        errorText = failure.what();
+    } catch (const std::runtime_error& error) {
+        errorCode = WriteError::DeviceFailed;
         errorText = error.what();
     }
     QUENX_ERROR("adapter %s: %s", adapter.c_str(), errorText.c_str());
@@ -127,12 +141,12 @@ utils::PCIAddr SimulatedAdapter::address() {
 }
 
 std::vector<utils::FirmwareVersionInfo> SimulatedAdapter::components() {
-    const uint32_t generation = m_store.state().generation;
+    const std::uint32_t generation = m_store.state().generation;
     {
         const utils::Mutex::AutoLocker lock(m_cacheMutex);
         if (m_cacheFilled && m_cacheGeneration == generation) return m_cachedComponents;
     }
-    const std::vector<uint8_t> flash = m_store.content();
+    const std::vector<std::uint8_t> flash = m_store.content();
     std::vector<utils::FirmwareVersionInfo> found;
     if (!flash.empty()) found = parseOptionRom(flash).components();
     const utils::Mutex::AutoLocker lock(m_cacheMutex);
@@ -148,31 +162,31 @@ bool SimulatedAdapter::readComponents(std::vector<utils::FirmwareVersionInfo>& f
         FaultRun(m_faults, Operation::FirmwareVersion).reach();
         found = components();
         return true;
-    } catch (const OrderedFailure& failure) {
-        QUENX_ERROR("adapter %s: %s", m_description.name.c_str(), failure.text.c_str());
+    } catch (const OperationFailure& failure) {
+        QUENX_ERROR("adapter %s: %s", m_description.name.c_str(), failure.what());
         return false;
-    } catch (const FlashError& error) {
+    } catch (const std::runtime_error& error) {
         throw AdapterError("adapter " + m_description.name + ": " + error.what());
     }
 }
 
-int SimulatedAdapter::prepare(std::span<const uint8_t> file, std::span<uint8_t> output, uint32_t& imageSize,
-                              std::vector<utils::FirmwareType>& types) {
+int SimulatedAdapter::prepare(std::span<const std::uint8_t> file, std::span<std::uint8_t> output,
+                              std::uint32_t& imageSize, std::vector<utils::FirmwareType>& types) {
     m_progress.prepared();
     try {
         FaultRun(m_faults, Operation::Prepare).reach();
         return prepareUnguarded(file, output, imageSize, types);
-    } catch (const OrderedFailure& failure) {
-        QUENX_ERROR("adapter %s: %s", m_description.name.c_str(), failure.text.c_str());
-        return static_cast<int>(failure.code);
-    } catch (const FlashError& error) {
+    } catch (const OperationFailure& failure) {
+        QUENX_ERROR("adapter %s: %s", m_description.name.c_str(), failure.what());
+        return static_cast<int>(failure.code());
+    } catch (const std::runtime_error& error) {
         QUENX_ERROR("adapter %s: %s", m_description.name.c_str(), error.what());
-        return UNSPECIFIED_ERROR;
+        return PrepareStatus::UnspecifiedError;
     }
 }
 
-PrepareStatus SimulatedAdapter::prepareUnguarded(std::span<const uint8_t> file, std::span<uint8_t> output,
-                                                 uint32_t& imageSize,
+PrepareStatus SimulatedAdapter::prepareUnguarded(std::span<const std::uint8_t> file,
+                                                 std::span<std::uint8_t> output, std::uint32_t& imageSize,
                                                  std::vector<utils::FirmwareType>& types) {
     const PreparationTarget target{m_description.ids.vendor, m_description.ids.device,
                                    m_description.canBeUpdated, components()};
@@ -181,71 +195,73 @@ PrepareStatus SimulatedAdapter::prepareUnguarded(std::span<const uint8_t> file, 
         QUENX_ERROR("adapter %s: status %d: %s", m_description.name.c_str(), preparation.status,
                     preparation.reason.c_str());
     if (!hasOutput(preparation.status)) return preparation.status;
-    imageSize = static_cast<uint32_t>(composeChosen(preparation, file, output));
+    imageSize = static_cast<std::uint32_t>(composeChosen(preparation, file, output));
     types = preparation.types;
     return preparation.status;
 }
 
-void SimulatedAdapter::requireWritable(std::span<const uint8_t> image) const {
+void SimulatedAdapter::requireWritable(std::span<const std::uint8_t> image) const {
     if (!m_description.canBeUpdated)
-        throw OrderedFailure{ERROR_NOT_UPDATABLE, "this adapter cannot be updated"};
+        throw OperationFailure(WriteError::NotUpdatable, "this adapter cannot be updated");
     const RomFile rom = parseOptionRom(image);
-    if (rom.error) throw OrderedFailure{ERROR_BAD_IMAGE, "the image is not intact: " + *rom.error};
+    if (rom.error) throw OperationFailure(WriteError::BadImage, "the image is not intact: " + *rom.error);
     for (const RomImage& part : rom.images)
         if (!part.fits(m_description.ids.vendor, m_description.ids.device))
-            throw OrderedFailure{ERROR_BAD_IMAGE,
-                                 "the image is for PCI device " + formatIds(part.vendorId, part.deviceId) +
-                                     ", not for " +
-                                     formatIds(m_description.ids.vendor, m_description.ids.device)};
+            throw OperationFailure(WriteError::BadImage,
+                                   "the image is for PCI device " + formatIds(part.vendorId, part.deviceId) +
+                                       ", not for " +
+                                       formatIds(m_description.ids.vendor, m_description.ids.device));
 }
 
-bool SimulatedAdapter::write(std::span<const uint8_t> image, uint32_t& errorCode, std::string& errorText) {
+bool SimulatedAdapter::write(std::span<const std::uint8_t> image, std::uint32_t& errorCode,
+                             std::string& errorText) {
     return report(m_description.name, errorCode, errorText, [&] {
         requireWritable(image);
-        const FileLock lock = m_store.lockForWriting();
+        const os::FileLock lock = m_store.lockForWriting();
         if (!lock.isHeld())
-            throw OrderedFailure{ERROR_BUSY, describeHolder(m_description.name, lock.holder())};
+            throw OperationFailure(WriteError::Busy, describeHolder(m_description.name, lock.holder()));
         writeLocked(image);
     });
 }
 
-void SimulatedAdapter::writeLocked(std::span<const uint8_t> image) {
-    constexpr uint64_t NOT_YET_BOOTED = 99;  // 100 is for the update that is in force
-    const std::vector<uint8_t> merged = mergeOptionRoms(m_store.content(), image);
+void SimulatedAdapter::writeLocked(std::span<const std::uint8_t> image) {
+    constexpr std::uint64_t kNotYetBooted = 99;  // 100 is for the update that is in force
+    const std::vector<std::uint8_t> merged = mergeOptionRoms(m_store.content(), image);
     if (const RomFile rom = parseOptionRom(merged); rom.error)
-        throw OrderedFailure{ERROR_BAD_IMAGE,
-                             "with what the adapter keeps it would be no ROM: " + *rom.error};
+        throw OperationFailure(WriteError::BadImage,
+                               "with what the adapter keeps it would not be a ROM: " + *rom.error);
     const WritingScope writing(m_progress);
     const Pace pace(m_description.writeSpeed);
     FaultRun faults(m_faults, Operation::Write);
     m_store.write(merged, [&](std::size_t written) {
-        const auto percent = static_cast<unsigned>(uint64_t{written} * 100 / merged.size());
+        const auto percent = static_cast<unsigned int>(std::uint64_t{written} * 100 / merged.size());
         pace.waitFor(written);
-        m_progress.advance(static_cast<uint16_t>(uint64_t{written} * NOT_YET_BOOTED / merged.size()));
+        m_progress.advance(
+            static_cast<std::uint16_t>(std::uint64_t{written} * kNotYetBooted / merged.size()));
         faults.reach(percent);
     });
     m_progress.advance(100);
 }
 
 bool SimulatedAdapter::updateCapabilityWord(const std::vector<utils::FirmwareType>& types,
-                                            uint32_t& errorCode, std::string& errorText) {
+                                            std::uint32_t& errorCode, std::string& errorText) {
     return report(m_description.name, errorCode, errorText, [&] {
         FaultRun(m_faults, Operation::CapabilityWord).reach();
-        uint32_t wanted = 0;
+        std::uint32_t wanted = 0;
         for (const utils::FirmwareType type : types)
             wanted |= bitOf(type);
-        const uint32_t held = bitsOf(components());
+        const std::uint32_t held = bitsOf(components());
         m_store.changeState(
             [&](FlashState& state) { state.capabilityWord = (state.capabilityWord | wanted) & held; });
     });
 }
 
 bool SimulatedAdapter::setBootType(BootType type) {
-    uint32_t errorCode = 0;
+    std::uint32_t errorCode = 0;
     std::string errorText;
     return report(m_description.name, errorCode, errorText, [&] {
         FaultRun(m_faults, Operation::BootType).reach();
-        m_store.changeState([type](FlashState& state) { state.bootType = static_cast<uint32_t>(type); });
+        m_store.changeState([type](FlashState& state) { state.bootType = static_cast<std::uint32_t>(type); });
     });
 }
 
@@ -254,10 +270,8 @@ AdapterInfo SimulatedAdapter::info() {
         FaultRun(m_faults, Operation::Info).reach();
         return {m_description.mac, m_description.speed, m_description.linkUp,
                 m_description.ids, components(),        m_description.description};
-    } catch (const OrderedFailure& failure) {
-        throw AdapterError("adapter " + m_description.name + ": " + failure.text);
-    } catch (const FlashError& error) {
-        throw AdapterError("adapter " + m_description.name + ": " + error.what());
+    } catch (const std::runtime_error& failure) {
+        throw AdapterError("adapter " + m_description.name + ": " + failure.what());
     }
 }
 

@@ -28,25 +28,25 @@ class SimulatedAdapter {
 
     utils::PCIAddr address();
     bool readComponents(std::vector<utils::FirmwareVersionInfo>& components);
-    int prepare(std::span<const uint8_t> file, std::span<uint8_t> output, uint32_t& imageSize,
+    int prepare(std::span<const std::uint8_t> file, std::span<std::uint8_t> output, std::uint32_t& imageSize,
                 std::vector<utils::FirmwareType>& types);
-    bool write(std::span<const uint8_t> image, uint32_t& errorCode, std::string& errorText);
-    bool updateCapabilityWord(const std::vector<utils::FirmwareType>& types, uint32_t& errorCode,
+    bool write(std::span<const std::uint8_t> image, std::uint32_t& errorCode, std::string& errorText);
+    bool updateCapabilityWord(const std::vector<utils::FirmwareType>& types, std::uint32_t& errorCode,
                               std::string& errorText);
-    uint16_t progress() const { return m_progress.percent(); }
+    std::uint16_t progress() const { return m_progress.percent(); }
     bool setBootType(BootType type);
     AdapterInfo info();
 
-    /// What it remembers and what it boots; for tests and tools. Throw FlashError.
+    /// What it remembers and what it boots; for tests and tools. Throw std::runtime_error.
     FlashState state() const { return m_store.state(); }
-    std::vector<uint8_t> flashContent() const { return m_store.content(); }
+    std::vector<std::uint8_t> flashContent() const { return m_store.content(); }
 
   private:
     std::vector<utils::FirmwareVersionInfo> components();
-    void requireWritable(std::span<const uint8_t> image) const;
-    void writeLocked(std::span<const uint8_t> image);
-    PrepareStatus prepareUnguarded(std::span<const uint8_t> file, std::span<uint8_t> output,
-                                   uint32_t& imageSize, std::vector<utils::FirmwareType>& types);
+    void requireWritable(std::span<const std::uint8_t> image) const;
+    void writeLocked(std::span<const std::uint8_t> image);
+    PrepareStatus prepareUnguarded(std::span<const std::uint8_t> file, std::span<std::uint8_t> output,
+                                   std::uint32_t& imageSize, std::vector<utils::FirmwareType>& types);
 
     const AdapterDescription m_description;
     FlashStore m_store;
@@ -56,7 +56,7 @@ class SimulatedAdapter {
     // What the flash held when it was last read, so that a query need not read it again.
     utils::Mutex m_cacheMutex;
     bool m_cacheFilled QUENX_GUARDED_BY(m_cacheMutex) = false;
-    uint32_t m_cacheGeneration QUENX_GUARDED_BY(m_cacheMutex) = 0;
+    std::uint32_t m_cacheGeneration QUENX_GUARDED_BY(m_cacheMutex) = 0;
     std::vector<utils::FirmwareVersionInfo> m_cachedComponents QUENX_GUARDED_BY(m_cacheMutex);
 };
 

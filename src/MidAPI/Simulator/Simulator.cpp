@@ -10,8 +10,8 @@ std::string unknown(const std::string& name) {
     return "there is no adapter " + name;
 }
 
-bool refuseUnknown(const std::string& name, uint32_t& errorCode, std::string& errorText) {
-    errorCode = ERROR_UNKNOWN_ADAPTER;
+bool refuseUnknown(const std::string& name, std::uint32_t& errorCode, std::string& errorText) {
+    errorCode = WriteError::UnknownAdapter;
     errorText = unknown(name);
     QUENX_ERROR_TEXT(errorText);
     return false;
@@ -53,7 +53,7 @@ FlashState Simulator::flashState(const std::string& adapter) const {
     return require(adapter).state();
 }
 
-std::vector<uint8_t> Simulator::flashContent(const std::string& adapter) const {
+std::vector<std::uint8_t> Simulator::flashContent(const std::string& adapter) const {
     return require(adapter).flashContent();
 }
 
@@ -62,8 +62,8 @@ utils::StringArray Simulator::enumerateAdapters() {
     for (const std::unique_ptr<SimulatedAdapter>& adapter : m_adapters) {
         try {
             FaultRun(adapter->faults(), Operation::Enumerate).reach();
-        } catch (const OrderedFailure& failure) {
-            QUENX_ERROR_TEXT(failure.text);
+        } catch (const OperationFailure& failure) {
+            QUENX_ERROR_TEXT(failure.what());
             return {};
         }
         names.push_back(adapter->description().name);
@@ -74,8 +74,8 @@ utils::StringArray Simulator::enumerateAdapters() {
 utils::PCIAddr Simulator::getPCIAddress(const std::string& adapter) {
     try {
         return require(adapter).address();
-    } catch (const OrderedFailure& failure) {
-        throw AdapterError("adapter " + adapter + ": " + failure.text);
+    } catch (const OperationFailure& failure) {
+        throw AdapterError("adapter " + adapter + ": " + failure.what());
     }
 }
 
@@ -90,37 +90,37 @@ bool Simulator::getAdapterFirmwareVersion(const std::string& adapter,
     return found != nullptr && found->readComponents(components);
 }
 
-int Simulator::prepareFlashImage(const std::string& adapter, const uint8_t* file, uint32_t fileSize,
-                                 uint8_t* output, uint32_t* imageSize,
+int Simulator::prepareFlashImage(const std::string& adapter, const std::uint8_t* file, std::uint32_t fileSize,
+                                 std::uint8_t* output, std::uint32_t* imageSize,
                                  std::vector<utils::FirmwareType>& types) {
     SimulatedAdapter* found = find(adapter);
     const bool buffersMissing = fileSize != 0 && (file == nullptr || output == nullptr);
     if (found == nullptr || buffersMissing || imageSize == nullptr || *imageSize < fileSize) {
-        QUENX_ERROR("adapter %s: status %d: %s", adapter.c_str(), INVALID_PARAMETER,
+        QUENX_ERROR("adapter %s: status %d: %s", adapter.c_str(), PrepareStatus::InvalidParameter,
                     found == nullptr ? "there is no such adapter" : "a buffer is missing or too small");
-        return INVALID_PARAMETER;
+        return PrepareStatus::InvalidParameter;
     }
     return found->prepare({file, fileSize}, {output, *imageSize}, *imageSize, types);
 }
 
-bool Simulator::writeFlashImage(const std::string& adapter, const uint8_t* image, uint32_t imageSize,
-                                uint32_t& errorCode, std::string& errorText) {
+bool Simulator::writeFlashImage(const std::string& adapter, const std::uint8_t* image,
+                                std::uint32_t imageSize, std::uint32_t& errorCode, std::string& errorText) {
     SimulatedAdapter* found = find(adapter);
     if (found == nullptr) return refuseUnknown(adapter, errorCode, errorText);
     return found->write({image, image == nullptr ? 0 : imageSize}, errorCode, errorText);
 }
 
 bool Simulator::updateCapabilityWord(const std::string& adapter,
-                                     const std::vector<utils::FirmwareType>& types, uint32_t& errorCode,
+                                     const std::vector<utils::FirmwareType>& types, std::uint32_t& errorCode,
                                      std::string& errorText) {
     SimulatedAdapter* found = find(adapter);
     if (found == nullptr) return refuseUnknown(adapter, errorCode, errorText);
     return found->updateCapabilityWord(types, errorCode, errorText);
 }
 
-uint16_t Simulator::getFlashImageUpdateProgress(const std::string& adapter) {
+std::uint16_t Simulator::getFlashImageUpdateProgress(const std::string& adapter) {
     const SimulatedAdapter* found = find(adapter);
-    return found != nullptr ? found->progress() : uint16_t{0};
+    return found != nullptr ? found->progress() : std::uint16_t{0};
 }
 
 bool Simulator::setBootType(const std::string& adapter, BootType type) {

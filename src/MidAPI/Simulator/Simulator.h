@@ -29,22 +29,24 @@ class QUENX_EXPORT Simulator : public Backend {
     void injectFault(const std::string& adapter, Fault fault);
     /// Cancels all faults of an adapter, also those of the description.
     void clearFaults(const std::string& adapter);
-    /// The persistent record of an adapter and the content of its flash. Throw AdapterError or FlashError.
+    /// The persistent record of an adapter and the content of its flash. Throw AdapterError or
+    /// std::runtime_error.
     FlashState flashState(const std::string& adapter) const;
-    std::vector<uint8_t> flashContent(const std::string& adapter) const;
+    std::vector<std::uint8_t> flashContent(const std::string& adapter) const;
 
     utils::StringArray enumerateAdapters() override;
     utils::PCIAddr getPCIAddress(const std::string& adapter) override;
     bool getCanBeUpdated(const std::string& adapter) override;
     bool getAdapterFirmwareVersion(const std::string& adapter,
                                    std::vector<utils::FirmwareVersionInfo>& components) override;
-    int prepareFlashImage(const std::string& adapter, const uint8_t* file, uint32_t fileSize, uint8_t* output,
-                          uint32_t* imageSize, std::vector<utils::FirmwareType>& types) override;
-    bool writeFlashImage(const std::string& adapter, const uint8_t* image, uint32_t imageSize,
-                         uint32_t& errorCode, std::string& errorText) override;
+    int prepareFlashImage(const std::string& adapter, const std::uint8_t* file, std::uint32_t fileSize,
+                          std::uint8_t* output, std::uint32_t* imageSize,
+                          std::vector<utils::FirmwareType>& types) override;
+    bool writeFlashImage(const std::string& adapter, const std::uint8_t* image, std::uint32_t imageSize,
+                         std::uint32_t& errorCode, std::string& errorText) override;
     bool updateCapabilityWord(const std::string& adapter, const std::vector<utils::FirmwareType>& types,
-                              uint32_t& errorCode, std::string& errorText) override;
-    uint16_t getFlashImageUpdateProgress(const std::string& adapter) override;
+                              std::uint32_t& errorCode, std::string& errorText) override;
+    std::uint16_t getFlashImageUpdateProgress(const std::string& adapter) override;
     bool setBootType(const std::string& adapter, BootType type) override;
     AdapterInfo getAdapterInfo(const std::string& adapter) override;
 

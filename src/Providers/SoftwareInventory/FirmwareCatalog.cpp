@@ -3,7 +3,7 @@
 #include <sys/stat.h>
 
 #include "MidAPI/Image/OptionRom.h"
-#include "MidAPI/Image/RomLayout.h"
+#include "MidAPI/Image/RomFormat.h"
 #include "Utils/Log.h"
 #include "Utils/Os/Linux/SMASHv2Config.h"
 #include "Utils/Os/Linux/linux.h"
@@ -20,7 +20,7 @@ std::int64_t nanoseconds(const timespec& time) {
 }
 
 bool hasSignature(std::span<const std::uint8_t> bytes) {
-    return bytes[0] == (ma::rom::SIGNATURE & 0xff) && bytes[1] == ma::rom::SIGNATURE >> 8;
+    return bytes[0] == (ma::rom::kSignature & 0xff) && bytes[1] == ma::rom::kSignature >> 8;
 }
 
 /// The bytes of a file that begins as a ROM does; otherwise nothing, and the reason.

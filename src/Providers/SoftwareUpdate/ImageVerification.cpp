@@ -97,21 +97,21 @@ void judgeOtherTypes(bool force, AdapterClaim& claim, const std::string& uri) {
 void judge(int status, bool force, AdapterClaim& claim, const std::string& uri,
            const std::string& adapterName) {
     switch (status) {
-        case ma::INVALID_PARAMETER:
+        case ma::PrepareStatus::InvalidParameter:
             refuse<utils::EInvalidParameter>(
                 claim, utils::formatStr("Invalid parameter detected for %s", uri.c_str()));
-        case ma::IMAGE_NOT_SUPPORTED:
+        case ma::PrepareStatus::ImageNotSupported:
             refuse<EAdapterNotSupported>(claim, utils::formatStr("Image %s is not supported for adapter %s",
                                                                  uri.c_str(), adapterName.c_str()));
-        case ma::IMAGE_IS_OLDER:
+        case ma::PrepareStatus::ImageIsOlder:
             if (!force) refuseWithoutForce(claim, uri);
             return;
-        case ma::IMAGE_TYPES_DIFFER:
+        case ma::PrepareStatus::ImageTypesDiffer:
             judgeOtherTypes(force, claim, uri);
             return;
-        case ma::IMAGE_NOT_APPLICABLE:
+        case ma::PrepareStatus::ImageNotApplicable:
             refuse<ENotApplicableForTarget>(claim, utils::formatStr("Not applicable for %s", uri.c_str()));
-        case ma::UNSPECIFIED_ERROR:
+        case ma::PrepareStatus::UnspecifiedError:
             refuse<utils::EUnspecifiedError>(
                 claim, utils::formatStr("Unspecified error occurred for %s", uri.c_str()));
         default:

@@ -63,13 +63,13 @@ TEST_F(Ports, ShowWhatTheAdapterSaysOfItself) {
 TEST_F(Ports, StayTheSameObjectsWhileTheAdaptersDo) {
     const core::RequestScope scope;
     const auto before = objects();
-    std::string changed = test::TEST_ADAPTERS;
+    std::string changed = test::kTestAdapters;
     changed.replace(changed.find("link = false"), 12, "link = true ");
     changeAdapters(changed);
     EXPECT_EQ(table("Quenx_EthernetPort", {"EnabledState"}), (Rows{"2", "2", "2", "2", "2"}));
     EXPECT_EQ(objects(), before);
 
-    changed = test::TEST_ADAPTERS;
+    changed = test::kTestAdapters;
     changeAdapters(changed.replace(changed.find("0000:03:00.1"), 12, "0000:09:00.1"));
     EXPECT_EQ(table("Quenx_EthernetPort", {"OtherIdentifyingInfo"}).at(1),
               "09:00.1, 1af4:1041, 1af4:1041, Supported");

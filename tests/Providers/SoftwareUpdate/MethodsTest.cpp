@@ -3,7 +3,7 @@
 
 #include <set>
 
-#include "MidAPI/Image/RomLayout.h"
+#include "MidAPI/Image/RomFormat.h"
 #include "Providers/SoftwareUpdate/UpdateTest.h"
 #include "Support/TestRoms.h"
 
@@ -209,7 +209,8 @@ std::vector<MethodsTest::Row> MethodsTest::resolutionRows() const {
     const CimPath noPath(std::string("no path at all"));
     const CimPath installed(std::string("Quenx_SoftwareIdentity.InstanceID=\"Quenx:eth0:IMG_PXE\""));
     auto foreign = madeRom({{FirmwareType::PXE, 2}});
-    foreign[foreign[ma::rom::HEADER_DATA_STRUCTURE] + ma::rom::PCIR_CODE_TYPE] = ma::rom::CODE_OPEN_FIRMWARE;
+    foreign[foreign[ma::rom::kHeaderDataStructure] + ma::rom::kPcirCodeType] =
+        ma::rom::CodeType::OpenFirmware;
     const CimPath typeless = identityOf(file("foreign.rom", foreign));
     const std::string noTypes = "Source '" + typeless.toString() + "' does not contain any TargetTypes";
     const std::string notFound = "Firmware Update cannot find instance '";

@@ -1,0 +1,180 @@
+#include "MidAPI/Toml.h"
+
+#include <algorithm>
+
+#include "Utils/Utils.h"
+
+namespace ma {
+namespace {
+
+constexpr std::string_view kBlanks = " \t\r\n";
+
+bool isAscii(char c) {
+    return (static_cast<unsigned char>(c) & 0x80) == 0;
+}
+
+/// Looks at a text for characters beyond ASCII outside quotes and comments. TOML allows none there, but
+/// toml++ 3.3 comes to undefined behaviour when it asks whether such a character is a blank. Up to the first
+/// other mistake, where the parser stops, this finds quotes and comments where the parser does.
+class AsciiCheck {
+  public:
+    explicit AsciiCheck(std::string_view text) : m_text(text) {
+        if (m_text.starts_with("\xEF\xBB\xBF")) m_at = 3;  // the byte order mark is allowed
+    }
+
+    /// @throws TomlError
+    void run() {
+        for (; m_at < m_text.size(); ++m_at) {
+            const char c = m_text[m_at];
+            if (c == '#')
+                m_at = m_text.find('\n', m_at);
+            else if (c == '"' || c == '\'')
+                passQuoted(c);
+            else
+                requireAscii(m_at);
+            if (m_at == std::string_view::npos) return;
+        }
+    }
+
+  private:
+    void requireAscii(std::size_t place) const {
+        if (place >= m_text.size() || isAscii(m_text[place])) return;
+        const auto lines =
+            std::count(m_text.begin(), m_text.begin() + static_cast<std::ptrdiff_t>(place), '\n');
+        throw TomlError("a character beyond ASCII stands outside quotes",
+                        static_cast<std::size_t>(lines) + 1);
+    }
+
+    /// Ends on the last character of a quoted text, or at the end of its line when it is not closed.
+    void passQuoted(char quote) {
+        const std::string three(3, quote);
+        const bool hasLines = m_text.substr(m_at).starts_with(three);
+        for (m_at += hasLines ? 3 : 1; m_at < m_text.size(); ++m_at) {
+            const char c = m_text[m_at];
+            if (c == '\\' && quote == '"') {
+                passEscape(hasLines);
+            } else if (hasLines ? m_text.substr(m_at).starts_with(three) : c == quote || c == '\n') {
+                if (hasLines) m_at = std::min(m_text.find_first_not_of(quote, m_at), m_at + 5) - 1;
+                return;
+            }
+        }
+    }
+
+    /// A backslash at the end of a line continues it at the next character that is not a blank.
+    void passEscape(bool hasLines) {
+        const std::size_t next = m_text.find_first_not_of(kBlanks, m_at + 1);
+        if (hasLines && next != m_at + 1) requireAscii(next);
+        ++m_at;
+    }
+
+    std::string_view m_text;
+    std::size_t m_at = 0;
+};
+
+/// "a, b or c"
+std::string listOf(std::span<const std::string_view> names) {
+    std::string result;
+    for (std::size_t index = 0; index < names.size(); ++index) {
+        if (index != 0) result += index + 1 == names.size() ? " or " : ", ";
+        result += names[index];
+    }
+    return result;
+}
+
+}  // namespace
+
+TomlError::~TomlError() = default;
+
+toml::table parseToml(std::string_view text) {
+    AsciiCheck(text).run();
+    try {
+        return toml::parse(text);
+    } catch (const toml::parse_error& error) {
+        throw TomlError(std::string(error.description()), error.source().begin.line);
+    }
+}
+
+std::string inQuotes(std::string_view text) {
+    constexpr std::size_t kLongest = 60;
+    std::string result = "\"";
+    for (const char character : text.substr(0, kLongest))
+        result += utils::isControl(character) ? '?' : character;
+    return result + (text.size() > kLongest ? "...\"" : "\"");
+}
+
+void TomlTable::failAt(const toml::source_region& where, const std::string& what) const {
+    throw AdapterError(m_fileName + ", line " + std::to_string(where.begin.line) + ": " + m_subject + ": " +
+                       what);
+}
+
+void TomlTable::fail(std::string_view key, const std::string& what) const {
+    const toml::node* node = m_table.get(key);
+    failAt(node != nullptr ? node->source() : m_table.source(), what);
+}
+
+void TomlTable::refuse(std::string_view key, std::string_view value, const std::string& expected) const {
+    fail(key, "\"" + std::string(key) + "\" is " + inQuotes(value) + ", it must be " + expected);
+}
+
+std::optional<std::string> TomlTable::text(std::string_view key) const {
+    const toml::node* node = m_table.get(key);
+    if (node == nullptr) return std::nullopt;
+    if (const auto* value = node->as_string()) return value->get();
+    fail(key, "\"" + std::string(key) + "\" must be a text in quotes");
+}
+
+std::string TomlTable::requiredText(std::string_view key, std::string_view example) const {
+    if (std::optional<std::string> value = text(key)) return *value;
+    fail(key, "\"" + std::string(key) + "\" is missing; write for example " + std::string(key) + " = \"" +
+                  std::string(example) + "\"");
+}
+
+std::optional<std::uint64_t> TomlTable::number(std::string_view key, std::uint64_t highest) const {
+    const toml::node* node = m_table.get(key);
+    if (node == nullptr) return std::nullopt;
+    const auto* value = node->as_integer();
+    if (value != nullptr && value->get() >= 0 && static_cast<std::uint64_t>(value->get()) <= highest)
+        return static_cast<std::uint64_t>(value->get());
+    fail(key, "\"" + std::string(key) + "\" must be a whole number from 0 to " + std::to_string(highest));
+}
+
+bool TomlTable::flag(std::string_view key, bool otherwise) const {
+    const toml::node* node = m_table.get(key);
+    if (node == nullptr) return otherwise;
+    if (const auto* value = node->as_boolean()) return value->get();
+    fail(key, "\"" + std::string(key) + "\" must be true or false");
+}
+
+std::vector<const toml::table*> TomlTable::tables(std::string_view key) const {
+    std::vector<const toml::table*> result;
+    const toml::node* node = m_table.get(key);
+    if (node == nullptr) return result;
+    if (const toml::array* array = node->as_array())
+        for (const toml::node& element : *array)
+            result.push_back(element.as_table());
+    if (node->is_array() && std::find(result.begin(), result.end(), nullptr) == result.end()) return result;
+    fail(key, "\"" + std::string(key) + "\" must be a list of tables");
+}
+
+std::optional<std::size_t> TomlTable::choice(std::string_view key,
+                                             std::span<const std::string_view> names) const {
+    const std::optional<std::string> value = text(key);
+    if (!value) return std::nullopt;
+    const auto found = std::find(names.begin(), names.end(), *value);
+    if (found != names.end()) return static_cast<std::size_t>(found - names.begin());
+    refuse(key, *value, listOf(names));
+}
+
+std::size_t TomlTable::requiredChoice(std::string_view key, std::span<const std::string_view> names) const {
+    if (const std::optional<std::size_t> index = choice(key, names)) return *index;
+    fail(key, "\"" + std::string(key) + "\" is missing; it must be " + listOf(names));
+}
+
+void TomlTable::allowOnly(std::span<const std::string_view> keys) const {
+    for (const auto& [key, node] : m_table) {
+        if (std::find(keys.begin(), keys.end(), key.str()) != keys.end()) continue;
+        failAt(key.source(), "unknown key " + inQuotes(key.str()) + "; the keys are " + listOf(keys));
+    }
+}
+
+}  // namespace ma
