@@ -23,7 +23,7 @@ enum class BootType : std::uint32_t {
 /// What prepareFlashImage() answers. Callers take every value above 6 like 0.
 enum PrepareStatus : int {
     Prepared = 0,           ///< the output buffer holds the image to write
-    InvalidParameter = 1,   ///< no such adapter, an empty file, or a file that is no intact ROM image
+    InvalidParameter = 1,   ///< no such adapter, an empty file, or a file that is not an intact ROM image
     ImageNotSupported = 2,  ///< made for another card, or the adapter cannot be updated at all
     ImageIsOlder = 3,       ///< older than what is installed, same types; the output is filled all the same
     ImageTypesDiffer = 4,   ///< other image types than the adapter carries; the output is filled all the same
@@ -31,7 +31,7 @@ enum PrepareStatus : int {
     UnspecifiedError = 6,    ///< the adapter itself could not be read
 };
 
-/// Error codes that writeFlashImage() and updateCapabilityWord() leave behind; a backend or an ordered fault
+/// Error codes that writeFlashImage() and updateCapabilityWord() leave behind; a backend or a simulated fault
 /// may leave others.
 enum WriteError : std::uint32_t {
     NoError = 0,

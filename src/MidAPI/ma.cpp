@@ -25,14 +25,17 @@ std::shared_ptr<Backend> makeDefaultBackend() {
     const std::string description = environmentOr(kDescriptionVariable, "");
     const std::string state = environmentOr(kStateVariable, kDefaultState);
     if (!description.empty()) return std::make_shared<Simulator>(description, state);
+    // A machine without simulated adapters has no description, and no adapters; that is not a mistake.
     if (::access(kDefaultDescription, F_OK) == 0)
         return std::make_shared<Simulator>(kDefaultDescription, state);
     return std::make_shared<Simulator>(std::vector<AdapterDescription>{}, state);
 }
 
-/// The backend in use. A failure to make one is not remembered: the next call reads the mended description.
+/// The backend in use. A failure to make one is not remembered: the next call reads the corrected
+/// description.
 class Selection {
   public:
+    // A shared pointer, so that a call that has begun keeps its backend while another is put in place.
     std::shared_ptr<Backend> current() {
         const std::lock_guard lock(m_mutex);
         if (!m_backend) m_backend = makeDefaultBackend();

@@ -27,7 +27,7 @@ void TimeStamp::Init(bool logStart) {
 
 TimeStamp::~TimeStamp() {
     const std::uint64_t milliseconds = (os::getuSecondsSinceEpoch() - m_start) / 1000;
-    // Intended: only the low 32 bits are shown, as a signed number.
+    // Log readers know this as a signed number of 32 bits.
     QUENX_DEBUG("time(%s) = %dms ", m_name.c_str(), static_cast<std::int32_t>(milliseconds));
 }
 

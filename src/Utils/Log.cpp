@@ -71,7 +71,8 @@ std::string escapeForSyslog(const std::string& line) {
     return format;
 }
 
-// The format is no literal on purpose; escapeForSyslog has made it harmless.
+// A finished line goes to syslog as its format, so that %m works in messages; escapeForSyslog has made it
+// harmless.
 #pragma GCC diagnostic push
 #pragma GCC diagnostic ignored "-Wformat-security"
 #pragma GCC diagnostic ignored "-Wformat-nonliteral"
@@ -128,7 +129,8 @@ void writeDebugLog(const char* file, const char* function, int line, std::string
     const ErrnoKeeper callersErrno;
     if (!isDebugLogged()) return;
     try {
-        // Intended: debug lines have the priority of errors and differ only in their level word.
+        // Debug lines have the priority of errors, so that a filter on priority never parts the two; the
+        // level word tells them apart.
         handOver(LOG_ERR, formatLogMessage(file, function, line, "debug", message), callersErrno);
     } catch (...) {
     }

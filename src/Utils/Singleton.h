@@ -82,7 +82,7 @@ Singleton<T>::Singleton() {
 template <typename T>
 Singleton<T>::~Singleton() {
     std::lock_guard<std::mutex> lock(m_registryMutex);
-    // Intended: the remembered one becomes current without a look at whether this one was.
+    // The remembered one becomes current even when this one was not: the order of destruction decides.
     currentInstance.store(m_previous);
     // Instances that are destroyed out of order must not bring this one back.
     Singleton** link = &m_newestAlive;

@@ -47,7 +47,7 @@ Time::Time(int year, int month, int day, int hour, int minute, int second) : m_i
     fields.tm_sec = second;
     // Not mktime and `timezone`: a zone whose offset has changed has another one for an old date.
     const std::time_t seconds = timegm(&fields);
-    // Intended: the last second of 1969 cannot be told from a failure.
+    // timegm() has no other way to fail: the last second of 1969 is refused too.
     if (seconds == -1) throw Exception("wrong time value");
     // Modulo 2^64 before 1970.
     m_value = static_cast<std::uint64_t>(seconds) * kMicrosecondsPerSecond;

@@ -58,13 +58,13 @@ class QUENX_EXPORT Time {
     /// Becomes an interval.
     Time& operator=(unsigned long long microseconds);
 
-    /// The result is an interval, even if this was a timestamp (intended).
+    /// The result is an interval, even if this was a timestamp.
     Time& operator+=(unsigned long long microseconds);
 
     /// An interval of the difference, modulo 2^64; the kinds are not looked at.
     Time operator-(Time other) const;
 
-    /// Compare the values only, never the kinds (intended).
+    /// Compare the values only, never the kinds.
     bool operator==(const Time& other) const { return m_value == other.m_value; }
     bool operator<=(const Time& other) const { return m_value <= other.m_value; }
 

@@ -42,7 +42,7 @@ void Uri::parseUri(std::string text) {
     }
     m_scheme = findScheme(pieces[0], pieces[1]);
     if (m_scheme == SupportedURISchemes::Unknown) {
-        QUENX_DEBUG("Uknown URI format of '%s'", text.c_str());  // the spelling is intended
+        QUENX_DEBUG("Uknown URI format of '%s'", text.c_str());
         return;
     }
     // What follows "scheme://", colons included.

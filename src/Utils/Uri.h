@@ -20,14 +20,14 @@ class QUENX_EXPORT Uri {
     Uri(const Uri&) = default;
     Uri& operator=(const Uri&) = default;
 
-    /// Sets scheme and path. "file:///opt/fw/a.rom" gives /opt/fw/a.rom; a host name is no more than the head
+    /// Sets scheme and path. "file:///opt/fw/a.rom" gives /opt/fw/a.rom; a host name is only the head
     /// of the path. A malformed text leaves the path as it was.
     void parseUri(std::string text);
 
     /// True if this build can read such locations.
     bool IsUriSupported() const;
 
-    /// True if it is a local file whose size can be had (the name's spelling is intended).
+    /// True if it is a local file whose size can be had.
     bool IsUriAccesible() const;
 
     std::string getSourcePath() const { return m_sourcePath; }

@@ -36,8 +36,8 @@ std::string mismatch(const PreparationTarget& target, const RomImage& image, std
            formatIds(target.vendorId, target.deviceId);
 }
 
-/// Every image must be for the card, also those that are not asked for: a file with images of two cards is no
-/// file to trust.
+/// Every image must be for the card, also those that are not asked for: nobody can trust a file with images
+/// of two cards.
 std::string anyMismatch(const PreparationTarget& target, const RomFile& rom) {
     for (std::size_t index = 0; index < rom.images.size(); ++index) {
         std::string found = mismatch(target, rom.images[index], index + 1);
@@ -113,7 +113,7 @@ RomFile chooseImages(const RomFile& rom, const Types& requested) {
 Preparation assessImage(const PreparationTarget& target, std::span<const std::uint8_t> file,
                         const std::vector<utils::FirmwareType>& requested) {
     const RomFile rom = parseOptionRom(file);
-    // A file for another card is called that even when it is damaged too: mending it would not help.
+    // A file for another card is called that even when it is damaged too: a whole copy would not help.
     if (std::string reason = anyMismatch(target, rom); !reason.empty())
         return refuse(PrepareStatus::ImageNotSupported, std::move(reason));
     if (rom.error)
@@ -130,6 +130,8 @@ Preparation assessImage(const PreparationTarget& target, std::span<const std::ui
     const Components incoming = chosen.components();
     for (const utils::FirmwareVersionInfo& component : incoming)
         result.types.push_back(component.type);
+    // Other types come before older versions: a caller may force either, but only the former needs a
+    // permission of the configuration too.
     if (typesDiffer(target, chosen)) {
         result.status = PrepareStatus::ImageTypesDiffer;
         result.reason =

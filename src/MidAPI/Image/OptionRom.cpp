@@ -6,6 +6,7 @@
 #include <cstdio>
 
 #include "MidAPI/Image/RomFormat.h"
+#include "Utils/Utils.h"
 
 namespace ma {
 namespace {
@@ -35,6 +36,7 @@ std::string textAt(Bytes image, std::size_t offset) {
     constexpr std::size_t kLongest = 255;
     std::string text;
     if (offset == 0) return text;
+    // These texts reach logs and terminals; a file may hold anything.
     for (; offset < image.size() && image[offset] != 0 && text.size() < kLongest; ++offset) {
         const char character = static_cast<char>(image[offset]);
         text += character >= ' ' && character <= '~' ? character : '?';
@@ -43,10 +45,11 @@ std::string textAt(Bytes image, std::size_t offset) {
 }
 
 bool contains(std::string_view text, std::string_view word) {
-    const auto sameLetter = [](char a, char b) { return (a | 0x20) == (b | 0x20); };
+    const auto sameLetter = [](char a, char b) { return utils::lowerCase(a) == utils::lowerCase(b); };
     return std::search(text.begin(), text.end(), word.begin(), word.end(), sameLetter) != text.end();
 }
 
+/// PXE, iSCSI and FCoE share one code type; makers tell them apart in the product name alone.
 utils::FirmwareType typeOfProduct(std::string_view product) {
     if (contains(product, "iSCSI")) return utils::FirmwareType::iSCSI;
     if (contains(product, "FCoE")) return utils::FirmwareType::FCoE;
@@ -58,6 +61,7 @@ utils::FirmwareType typeOfProduct(std::string_view product) {
 void readPnp(Bytes image, RomImage& out) {
     out.type = utils::FirmwareType::PXE;
     std::size_t offset = readLe16(image, rom::kHeaderPnp);
+    // Each header points to the next one: a chain may be a ring.
     for (int header = 0; header < rom::kMaxPnpHeaders && offset != 0; ++header) {
         if (!fitsIn(offset, rom::kPnpLength, image.size())) return;
         if (!std::equal(image.begin() + static_cast<std::ptrdiff_t>(offset),
@@ -101,6 +105,8 @@ MaybeFlaw locate(Bytes rest, RomImage& out) {
     const Bytes data = rest.subspan(offset);
     if (!std::equal(data.begin(), data.begin() + 4, "PCIR"))
         return Flaw{offset, "the PCI data structure does not begin with \"PCIR\""};
+    // The length is that of the data structure, not the run-time length in the header, which a BIOS may
+    // change.
     const std::size_t length = readLe16(data, rom::kPcirImageUnits) * rom::kBlockSize;
     if (length == 0) return Flaw{offset + rom::kPcirImageUnits, "the image length is 0"};
     if (length > rest.size()) {
@@ -124,6 +130,7 @@ MaybeFlaw readDataStructure(Bytes data, RomImage& out) {
     out.codeRevision = readLe16(data, rom::kPcirCodeRevision);
     out.codeType = data[rom::kPcirCodeType];
     out.last = (data[rom::kPcirIndicator] & rom::kLastImage) != 0;
+    // Older structures end before the pointers to the device list and the CLP entry point.
     if (data[rom::kPcirRevision] < 3 || readLe16(data, rom::kPcirLength) < rom::kPcirLengthRevision3)
         return std::nullopt;
     out.clpEntry = readLe16(data, rom::kPcirClp);
@@ -132,6 +139,7 @@ MaybeFlaw readDataStructure(Bytes data, RomImage& out) {
 
 MaybeFlaw readCode(Bytes image, RomImage& out) {
     if (out.codeType == rom::CodeType::PcAt) {
+        // Only images for a BIOS have a checksum (PCI Firmware Specification 3.x); UEFI verifies its own way.
         const std::uint8_t sum = rom::sumOfImage(image);
         if (sum != 0)
             return Flaw{0, "the checksum is wrong: the bytes sum to " + std::to_string(sum) + ", not 0"};
@@ -166,6 +174,7 @@ bool RomImage::carries(utils::FirmwareType wanted) const {
 
 std::vector<utils::FirmwareVersionInfo> RomFile::components() const {
     std::vector<utils::FirmwareVersionInfo> found;
+    // By type, not by image, so that the list is ascending: callers look types up by a binary search.
     for (std::size_t index = 1; index < kTypeNames.size(); ++index) {
         const auto type = static_cast<utils::FirmwareType>(index);
         std::optional<std::uint16_t> highest;

@@ -69,7 +69,7 @@ QUENX_EXPORT std::span<const std::uint8_t> imageBytes(std::span<const std::uint8
 /// "1af4:1041": ids as they are usually written.
 QUENX_EXPORT std::string formatIds(std::uint16_t vendor, std::uint16_t device);
 
-/// Name of a type as clients write it ("IMG_PXE"); empty for type 0 and for what is no type.
+/// Name of a type as clients write it ("IMG_PXE"); empty for type 0 and for an unknown type.
 QUENX_EXPORT std::string_view firmwareTypeName(utils::FirmwareType type);
 
 /// The type of this name, case and all; nothing for an unknown name (also for the empty one).

@@ -20,15 +20,16 @@ constexpr std::uint8_t kFarReturn = 0xCB;
 constexpr std::uint16_t kEfiBootServiceDriver = 11;
 constexpr std::uint16_t kEfiMachineX8664 = 0x8664;
 
-void mendChecksum(std::span<std::uint8_t> image, std::uint8_t wrongBy) {
+void fixChecksum(std::span<std::uint8_t> image, std::uint8_t wrongBy) {
     image[rom::kHeaderChecksum] = static_cast<std::uint8_t>(image[rom::kHeaderChecksum] - wrongBy);
 }
 
-/// Writes a byte of an image; the sum of a code type 0 image stays what it was.
+/// Writes a byte of an image; the sum of a code type 0 image stays what it was, also when it was wrong: a
+/// change of ours must not hide damage.
 void patch(std::span<std::uint8_t> image, bool hasChecksum, std::size_t offset, std::uint8_t value) {
     const auto change = static_cast<std::uint8_t>(value - image[offset]);
     image[offset] = value;
-    if (hasChecksum) mendChecksum(image, change);
+    if (hasChecksum) fixChecksum(image, change);
 }
 
 void setLastBit(std::span<std::uint8_t> image, bool last) {
@@ -42,6 +43,7 @@ void putText(std::span<std::uint8_t> image, std::size_t offset, std::string_view
     std::copy(text.begin(), text.end(), image.begin() + static_cast<std::ptrdiff_t>(offset));
 }
 
+/// Names by which typeOfProduct() finds the type again.
 std::string_view productName(utils::FirmwareType type) {
     if (type == utils::FirmwareType::iSCSI) return "Simulated iSCSI boot";
     if (type == utils::FirmwareType::FCoE) return "Simulated FCoE boot";
@@ -110,6 +112,8 @@ std::size_t composeOptionRom(std::span<const std::span<const std::uint8_t>> imag
 std::vector<std::uint8_t> mergeOptionRoms(std::span<const std::uint8_t> base,
                                           std::span<const std::uint8_t> update) {
     const RomFile incoming = parseOptionRom(update);
+    // A new image takes the place of the first old one of its type: a BIOS tries images in their order, and
+    // an update must not change what a machine boots first.
     std::vector<std::span<const std::uint8_t>> images;
     std::vector<bool> taken(incoming.images.size());
     const auto take = [&](utils::FirmwareType type) {
@@ -158,7 +162,7 @@ std::vector<std::uint8_t> makeRomImage(const NewRomImage& wanted) {
         putEfiHeader(image);
     else
         putPcAtHeader(image, wanted.type);
-    if (!efi) mendChecksum(image, rom::sumOfImage(image));
+    if (!efi) fixChecksum(image, rom::sumOfImage(image));
     return image;
 }
 

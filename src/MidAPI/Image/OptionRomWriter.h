@@ -14,7 +14,7 @@
 namespace ma {
 
 /// Writes whole images (see imageBytes()) one behind the other as a valid chain: only the last one has the
-/// last-image bit, and where that changed a code type 0 image its checksum is mended.
+/// last-image bit, and where that changed a code type 0 image its checksum is corrected.
 /// @param images  each the bytes of one image of a file that parseOptionRom() accepted; at least one
 /// @param output  at least as long as all images together; may not overlap them
 /// @return the length of the chain in bytes
@@ -27,7 +27,7 @@ QUENX_EXPORT std::size_t composeOptionRom(std::span<const std::span<const std::u
 QUENX_EXPORT std::vector<std::uint8_t> mergeOptionRoms(std::span<const std::uint8_t> base,
                                                        std::span<const std::uint8_t> update);
 
-/// Changes the code revision of one image of a parsed file, and mends its checksum.
+/// Changes the code revision of one image of a parsed file, and corrects its checksum.
 QUENX_EXPORT void setCodeRevision(std::span<std::uint8_t> file, const RomImage& image,
                                   std::uint16_t revision);
 

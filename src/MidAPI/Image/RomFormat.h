@@ -46,7 +46,7 @@ inline constexpr std::uint16_t kSignature = 0xAA55;
 inline constexpr std::size_t kHeaderRuntimeUnits = 0x02;
 inline constexpr std::size_t kHeaderEntry = 0x03;
 inline constexpr std::size_t kHeaderEfiSignature = 0x04;
-// The standard reserves this byte, and common images keep their checksum in it: a sum is mended here. The
+// The standard reserves this byte, and common images keep their checksum in it: a sum is corrected here. The
 // last byte of an image, the other usual place, may be code.
 inline constexpr std::size_t kHeaderChecksum = 0x06;
 inline constexpr std::size_t kHeaderEfiSubsystem = 0x08;

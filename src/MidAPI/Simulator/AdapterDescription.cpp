@@ -139,6 +139,7 @@ void readPlace(const TomlTable& table, AdapterDescription& adapter) {
     if (!parseMac(mac, adapter.mac)) table.refuse("mac", mac, "like \"52:54:00:12:34:56\"");
 }
 
+/// The name first: every other mistake is then told with it.
 AdapterDescription readAdapter(const toml::table& node, const TomlTable& top, std::size_t number) {
     const TomlTable unnamed = top.inner(node, "adapter " + std::to_string(number));
     AdapterDescription adapter;
@@ -172,6 +173,8 @@ std::optional<std::vector<std::uint8_t>> readDescriptionFile(const std::string& 
     throw AdapterError(std::string("the adapter description: ") + error.what());
 }
 
+/// Two ports under one name would be one adapter to every caller; two at one address, one card to the
+/// boot-type reset and to the inventory.
 void refuseDoubles(const std::vector<AdapterDescription>& adapters, const TomlTable& top) {
     for (std::size_t last = 1; last < adapters.size(); ++last) {
         for (std::size_t first = 0; first < last; ++first) {

@@ -37,6 +37,7 @@ FaultList::FaultList(std::vector<Fault> faults) {
 
 void FaultList::add(Fault fault) {
     const utils::Mutex::AutoLocker lock(m_mutex);
+    // Faults may be equal; the number tells which one was used up.
     m_entries.push_back({m_nextId++, std::move(fault)});
 }
 
@@ -67,6 +68,7 @@ void FaultRun::reach(unsigned int percent) {
             ++index;
             continue;
         }
+        // Off the list first: a fault that strikes throws.
         const FaultList::Entry entry = std::move(m_pending[index]);
         m_pending.erase(m_pending.begin() + static_cast<std::ptrdiff_t>(index));
         if (m_list.take(entry)) strike(entry.fault);

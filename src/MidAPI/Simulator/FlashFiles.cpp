@@ -29,6 +29,7 @@ void FlashFiles::makeFolder(const std::string& path) {
 }
 
 int FlashFiles::create(const std::string& path) {
+    // A link in the state directory must not lead the daemon, which is root, to another file.
     const int descriptor =
         ::open(path.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC | O_NOFOLLOW, kFileMode);
     if (descriptor < 0) fail("cannot write the file " + path);
@@ -36,6 +37,7 @@ int FlashFiles::create(const std::string& path) {
 }
 
 void FlashFiles::write(int descriptor, std::span<const std::uint8_t> bytes) {
+    // A signal, or a medium that is nearly full, ends a write early.
     while (!bytes.empty()) {
         const ssize_t written = ::write(descriptor, bytes.data(), bytes.size());
         if (written < 0 && errno == EINTR) continue;

@@ -112,7 +112,7 @@ std::optional<std::vector<std::uint8_t>> FlashStore::bankContent(const FlashStat
 }
 
 std::vector<std::uint8_t> FlashStore::content() const {
-    constexpr int kMostTries = 8;
+    constexpr int kMostTries = 8;  // each one more takes two whole updates in between
     for (int attempt = 0; attempt < kMostTries; ++attempt) {
         const std::optional<FlashState> state = storedState();
         if (!state) return m_factoryFlash;
@@ -135,6 +135,8 @@ os::FileLock FlashStore::lockForWriting() {
 
 void FlashStore::write(std::span<const std::uint8_t> image, const std::function<void(std::size_t)>& reached) {
     const FlashState before = initialise();
+    // The bank that boots may be the inactive one, when the active one is damaged; it must survive a power
+    // cut here.
     const auto bank = static_cast<std::uint8_t>(1 - bootedBank(before));
     writeBank(bank, image, reached);
     changeState([&](FlashState& state) {
@@ -145,6 +147,7 @@ void FlashStore::write(std::span<const std::uint8_t> image, const std::function<
 
 void FlashStore::changeState(const std::function<void(FlashState&)>& change) {
     initialise();
+    // Reading, changing and storing is one step for other processes: the boot type may change during a flash.
     const os::FileLock lock(path("state.lock"), os::FileLock::Mode::Wait);
     FlashState state = this->state();
     change(state);
@@ -174,6 +177,8 @@ std::uint8_t FlashStore::bootedBank(const FlashState& state) const {
 void FlashStore::makeFolders() {
     struct stat found {};
     if (::stat(m_folder.c_str(), &found) == 0) return;
+    // One by one, each entry brought to the medium: a folder that a power cut takes away takes the banks with
+    // it.
     for (std::size_t slash = m_folder.find('/', 1);; slash = m_folder.find('/', slash + 1)) {
         const std::string folder = m_folder.substr(0, slash);
         if (::stat(folder.c_str(), &found) != 0) {
@@ -204,6 +209,8 @@ void FlashStore::writeBank(std::uint8_t bank, std::span<const std::uint8_t> imag
 }
 
 void FlashStore::storeState(FlashState state) {
+    // A rename is atomic: a reader, and the next start after a power cut, finds the old record or the new
+    // one.
     {
         FlashFile file(*m_files, path(kNewStateFile));
         file.write(encodeFlashState(state));

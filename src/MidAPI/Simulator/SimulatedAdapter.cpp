@@ -99,6 +99,7 @@ FlashStore makeStore(const AdapterDescription& description, const std::string& s
                       std::move(files));
 }
 
+/// Who is busy, in words: "busy" alone leaves an administrator to search.
 std::string describeHolder(const std::string& adapter, pid_t holder) {
     std::string text = "adapter " + adapter + " is being written to by ";
     if (holder == 0) return text + "another process; wait until it is done";
@@ -107,8 +108,8 @@ std::string describeHolder(const std::string& adapter, pid_t holder) {
     return text + "process " + std::to_string(holder) + "; wait until it is done";
 }
 
-/// Runs an operation and turns what it throws into the API's code and text. A power loss and an ordered
-/// exception pass through.
+/// Runs an operation and turns what it throws into the API's code and text. PowerLoss and AdapterError, which
+/// faults throw, pass through.
 template <typename Action>
 bool report(const std::string& adapter, std::uint32_t& errorCode, std::string& errorText, Action action) {
     errorCode = WriteError::NoError;
@@ -172,6 +173,7 @@ bool SimulatedAdapter::readComponents(std::vector<utils::FirmwareVersionInfo>& f
 
 int SimulatedAdapter::prepare(std::span<const std::uint8_t> file, std::span<std::uint8_t> output,
                               std::uint32_t& imageSize, std::vector<utils::FirmwareType>& types) {
+    // Before the verdict: a client that looks now must not see the 100 of an earlier update.
     m_progress.prepared();
     try {
         FaultRun(m_faults, Operation::Prepare).reach();
@@ -216,6 +218,7 @@ void SimulatedAdapter::requireWritable(std::span<const std::uint8_t> image) cons
 bool SimulatedAdapter::write(std::span<const std::uint8_t> image, std::uint32_t& errorCode,
                              std::string& errorText) {
     return report(m_description.name, errorCode, errorText, [&] {
+        // What can be refused without the lock is: a second writer then reads what is wrong, not "busy".
         requireWritable(image);
         const os::FileLock lock = m_store.lockForWriting();
         if (!lock.isHeld())
@@ -227,6 +230,7 @@ bool SimulatedAdapter::write(std::span<const std::uint8_t> image, std::uint32_t&
 void SimulatedAdapter::writeLocked(std::span<const std::uint8_t> image) {
     constexpr std::uint64_t kNotYetBooted = 99;  // 100 is for the update that is in force
     const std::vector<std::uint8_t> merged = mergeOptionRoms(m_store.content(), image);
+    // Each image is in order, but together with those that stay they may be too many.
     if (const RomFile rom = parseOptionRom(merged); rom.error)
         throw OperationFailure(WriteError::BadImage,
                                "with what the adapter keeps it would not be a ROM: " + *rom.error);
@@ -250,6 +254,7 @@ bool SimulatedAdapter::updateCapabilityWord(const std::vector<utils::FirmwareTyp
         std::uint32_t wanted = 0;
         for (const utils::FirmwareType type : types)
             wanted |= bitOf(type);
+        // Bits of images that an update took away would let a BIOS look for what is not there.
         const std::uint32_t held = bitsOf(components());
         m_store.changeState(
             [&](FlashState& state) { state.capabilityWord = (state.capabilityWord | wanted) & held; });

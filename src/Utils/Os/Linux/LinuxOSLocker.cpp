@@ -18,7 +18,8 @@ OSLocker::~OSLocker() = default;
 
 OSLocker::AutoOSLocker::AutoOSLocker() {
     QUENX_DEBUG("autolocking semaphore");
-    // Intended: the status is not looked at, the lock is advisory.
+    // The lock is advisory: the worker owns its adapter through the claim, and must not fail because another
+    // library is busy with some other adapter.
     OSLocker::getInstance()->Lock();
 }
 

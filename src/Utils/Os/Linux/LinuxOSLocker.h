@@ -24,7 +24,7 @@ class QUENX_EXPORT OSLocker : public utils::Singleton<OSLocker> {
     static const char* GetSingletonName() { return "OSLocker"; }
 };
 
-/// Holds the current locker for a scope. A busy one does not stop it (intended: the lock is advisory), a
+/// Holds the current locker for a scope. A busy one does not stop it, since the lock is advisory, a
 /// missing one does. If it is gone at the end of the scope, that is logged and nothing else happens.
 class QUENX_EXPORT OSLocker::AutoOSLocker {
   public:

@@ -107,7 +107,7 @@ void SMASHv2Config::initialize() {
 }
 
 void SMASHv2Config::readLine(std::string line, StringArray& directories) {
-    // Intended: also in values.
+    // Everywhere, values included: so "Key=value" and "Key = value" read alike.
     replaceCharacter(line, '=', ' ');
     std::istringstream words(line);
     words.imbue(std::locale::classic());

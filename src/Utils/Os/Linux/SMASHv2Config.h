@@ -15,7 +15,7 @@
 /// use.
 QUENX_EXPORT extern const char* const SMASHv2_BASE_REG_PATH;
 QUENX_EXPORT extern const char* const SMASHv2_NAMESPACE_KEY;
-QUENX_EXPORT extern const char* const SMASHv2_DEFAUL_NAMESPACE;  // the missing T is intended
+QUENX_EXPORT extern const char* const SMASHv2_DEFAUL_NAMESPACE;
 QUENX_EXPORT extern const char* const SMASHv2_SEMAPHORE_TIMEOUT_KEY;
 QUENX_EXPORT extern const char* const VANTEX_REG_PATH;
 QUENX_EXPORT extern const char* const SMASHv2_CUSTOMIZATION_KEY;
@@ -27,7 +27,7 @@ namespace utils {
 
 /// The settings of /etc/quenx-cimprovider.conf. Every getter reads the file again, so an edited file takes
 /// effect at the next query. A setting that is missing or malformed keeps the value last read; the list of
-/// directories is built anew each time. Any thread may query; a file that cannot be read is no error.
+/// directories is built anew each time. Any thread may query; a file that cannot be read is not an error.
 ///
 /// `AutoSingleton<SMASHv2Config>::getInstance()` gives the current one. One constructed with another path is
 /// current while it lives.

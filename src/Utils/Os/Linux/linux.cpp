@@ -89,7 +89,7 @@ std::int32_t getFileSize(const std::string& path) {
     if (path.find('\0') != std::string::npos) failToOpen(path);
     if (stat(path.c_str(), &status) != 0 || !isReadableKind(status)) failToOpen(path);
     const Descriptor file(openForReading(path));
-    // Intended: number 0 counts as a failure, too.
+    // A process without standard input gets number 0 here, and counts as one that cannot open files.
     if (file.number() <= 0) failToOpen(path);
     if (fstat(file.number(), &status) != 0) {
         throw utils::Exception(utils::formatStr("Could not get info about the file %s", path.c_str()));

@@ -29,7 +29,7 @@ QUENX_EXPORT utils::StringArray getNetworkInterfaceNames();
 /// @throws utils::Exception "Could not open the file %s" for what does not exist, cannot be opened, has a NUL
 /// in its path, is larger than 2^31-1 bytes or is neither a file nor a directory, which is told before it is
 /// opened: a FIFO never blocks; "Could not get info about the file %s"; "The specyfied URI %s points to a
-/// directory" (the spelling is intended)
+/// directory"
 QUENX_EXPORT std::int32_t getFileSize(const std::string& path);
 
 /// Fills the buffer from the beginning of a regular file. Returns the bytes read: fewer than asked for when
