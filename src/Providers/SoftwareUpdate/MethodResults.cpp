@@ -22,6 +22,12 @@ const MethodTraits kInstallFromSoftwareIdentity{
     "Firmware Update",
     "Target and Collection are defined",
     true};
+const MethodTraits kCheckImage{"Quenx_SoftwareInstallationService::checkImage",
+                               "Verification of image",
+                               "Image verification",
+                               "Checking Firmware Update",
+                               nullptr,
+                               false};
 
 namespace {
 

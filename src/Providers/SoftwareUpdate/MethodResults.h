@@ -20,7 +20,8 @@ inline constexpr unsigned int CollectionNotSupported = 4108;
 
 }  // namespace MethodReturn
 
-/// What tells the three methods apart. The differences between the texts are intended.
+/// What tells the three methods and the check in process apart. The differences between the texts are
+/// intended.
 struct MethodTraits {
     const char* name;              ///< labels the call in the log
     const char* verification;      ///< "... returns: %d"
@@ -33,6 +34,7 @@ struct MethodTraits {
 extern const MethodTraits kCheckSoftwareIdentity;
 extern const MethodTraits kInstallFromUri;
 extern const MethodTraits kInstallFromSoftwareIdentity;
+extern const MethodTraits kCheckImage;
 
 /// Logs the verification's result and what it means for the target; returns the method's return value.
 unsigned int returnValueOf(const MethodTraits& method, int verifyJobResult, const std::string& target);

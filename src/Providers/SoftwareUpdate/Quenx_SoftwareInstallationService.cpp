@@ -4,12 +4,14 @@
 #include <optional>
 
 #include "Framework/Classes/RequestScope.h"
+#include "Providers/SoftwareUpdate/ImageExamination.h"
 #include "Providers/SoftwareUpdate/InstallOptions.h"
 #include "Providers/SoftwareUpdate/InstanceLookup.h"
 #include "Providers/SoftwareUpdate/MethodArguments.h"
 #include "Providers/SoftwareUpdate/MethodResults.h"
 #include "Providers/SoftwareUpdate/Quenx_ConcreteJobClass.h"
 #include "Providers/SoftwareUpdate/UpdateExceptions.h"
+#include "Providers/SoftwareUpdate/VerifyJobResult.h"
 #include "Utils/Debug.h"
 #include "Utils/Log.h"
 
@@ -63,6 +65,16 @@ unsigned int carryOut(const MethodTraits& method, Order& order, const std::strin
     } catch (...) {
         QUENX_DEBUG("Allocation error occured for '%s'", target.c_str());  // the spelling is intended
         return MethodReturn::InsufficientMemory;
+    }
+}
+
+/// A VerifyJobResult, found without claiming the adapter.
+int examine(const Order& order) {
+    try {
+        examineImage(order.adapterName, order.uri, order.options, order.values);
+        return VerifyJobResult::Success;
+    } catch (...) {
+        return verifyJobResultOfCurrentException();
     }
 }
 
@@ -193,4 +205,17 @@ unsigned int Quenx_SoftwareInstallationService::CheckSoftwareIdentity(CimPropert
         characteristics.push_back(kCharacteristic);
         MethodArguments::setCodes(out, kCharacteristics, std::move(characteristics));
     });
+}
+
+unsigned int Quenx_SoftwareInstallationService::checkImage(const std::string& uri,
+                                                           const core::CimPath& target,
+                                                           const std::vector<unsigned short>& options,
+                                                           const std::vector<std::string>& values) {
+    const utils::TimeStamp timing(kCheckImage.name);
+    const core::RequestScope scope;
+    if (!areOptionsAccepted(options)) return MethodReturn::InvalidParameter;
+    ResolvedTarget adapter = resolveTarget(kCheckImage, target);
+    if (adapter.returnValue != 0) return adapter.returnValue;
+    const Order order{std::move(adapter.adapterName), uri, options, values};
+    return returnValueOf(kCheckImage, examine(order), target.toString());
 }

@@ -6,11 +6,12 @@
 #include "Framework/Classes/CimClass.h"
 #include "Providers/Schema/CIM_SoftwareInstallationService.h"
 #include "Providers/SingletonInstanceClass.h"
+#include "Providers/UpdateInterfaces.h"
 
 /// The one software installation service (DSP1025), with its extrinsic methods. The methods return the values
 /// of the DMTF value map; only argument errors, a missing job registry and failed assertions leave them as
 /// exceptions.
-class Quenx_SoftwareInstallationService : public CIM_SoftwareInstallationService {
+class Quenx_SoftwareInstallationService : public CIM_SoftwareInstallationService, public update::ImageCheck {
   public:
     static const core::CimClassInfo classInfo;
 
@@ -28,6 +29,10 @@ class Quenx_SoftwareInstallationService : public CIM_SoftwareInstallationService
     /// Only verifies; 0 on success. No job is created, but the adapter stays claimed (intended).
     virtual unsigned int CheckSoftwareIdentity(core::CimPropertyList& in, core::CimPropertyList& out,
                                                core::CimInstance*& job);
+
+    unsigned int checkImage(const std::string& uri, const core::CimPath& target,
+                            const std::vector<unsigned short>& options,
+                            const std::vector<std::string>& values) override;
 
     /// "FirmwareUpdate", for every instance.
     static std::string getUniqId() { return "FirmwareUpdate"; }

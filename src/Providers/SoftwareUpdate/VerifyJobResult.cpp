@@ -28,16 +28,27 @@ constexpr Handler kHandlers[] = {
     {is<ENotApplicableForTarget>, VerifyJobResult::NotApplicableForTarget},
 };
 
+/// Null when the exception is no refusal.
+const Handler* handlerOf(const utils::Exception& exception) {
+    for (const Handler& handler : kHandlers) {
+        if (handler.handles(exception)) return &handler;
+    }
+    return nullptr;
+}
+
 }  // namespace
+
+bool isRefusal(const utils::Exception& exception) {
+    return handlerOf(exception) != nullptr;
+}
 
 int verifyJobResultOfCurrentException() noexcept {
     try {
         throw;
     } catch (const utils::Exception& exception) {
-        for (const Handler& handler : kHandlers) {
-            if (!handler.handles(exception)) continue;
+        if (const Handler* handler = handlerOf(exception)) {
             QUENX_ERROR("Exception: '%s'", exception.what());
-            return handler.code;
+            return handler->code;
         }
     } catch (...) {
         // Not a refusal: nothing to say beyond what it logged itself.

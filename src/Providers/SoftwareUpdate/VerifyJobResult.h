@@ -1,6 +1,8 @@
 #pragma once
 
-#include <exception>
+namespace utils {
+class Exception;
+}
 
 /// What the job registry answers a request with. An int and no closed set: whatever is not listed counts as
 /// success.
@@ -21,6 +23,10 @@ inline constexpr int TargetInUse = 105;
 inline constexpr int JobStartFailed = 106;
 
 }  // namespace VerifyJobResult
+
+/// True for the exceptions of UpdateExceptions.h: the image, the adapter or the options were judged. Anything
+/// else is a failure on the way there.
+bool isRefusal(const utils::Exception& exception);
 
 /// The code for the exception that is being handled; a refusal's text goes to the error log on the way.
 /// Call it within a catch block only. Never throws.

@@ -3,8 +3,11 @@
 
 #include <set>
 
+#include "Framework/Classes/CimBroker.h"
+#include "Framework/Classes/RequestScope.h"
 #include "MidAPI/Image/RomFormat.h"
 #include "Providers/SoftwareUpdate/UpdateTest.h"
+#include "Providers/UpdateInterfaces.h"
 #include "Support/TestRoms.h"
 
 namespace {
@@ -266,6 +269,49 @@ TEST_F(MethodsTest, AnswerEachCallWithItsValueLineJobAndClaim) {
     // The controller stood for the first of its ports.
     EXPECT_EQ(test::componentsOf("eth0"), "IMG_PXE 2, IMG_UEFI 1");
     EXPECT_EQ(test::componentsOf("eth1"), "IMG_PXE 1, IMG_UEFI 0");
+}
+
+/// What the check in process answers to the arguments of InstallFromURI.
+unsigned checkedInProcess(const CimPath& service, const Call& call) {
+    const core::RequestScope scope;
+    CimPath path = service;
+    auto* check = dynamic_cast<update::ImageCheck*>(core::GetCimBroker()->getInstanceByPath(path));
+    if (check == nullptr) return kThrows;
+    std::string uri;
+    CimPath target;
+    Codes options;
+    Texts values;
+    for (const Argument& argument : call.arguments) {
+        const core::CimScalar* scalar = argument.value.scalar();
+        const auto* elements = argument.value.elements();
+        if (argument.name == "URI") uri = std::get<std::string>(*scalar);
+        if (argument.name == "Target") target = std::get<CimPath>(*scalar);
+        if (elements == nullptr) continue;
+        for (const core::CimScalar& element : *elements) {
+            if (const auto* text = std::get_if<std::string>(&element)) values.push_back(*text);
+            if (const auto* code = std::get_if<std::uint64_t>(&element))
+                options.push_back(static_cast<unsigned short>(*code));
+        }
+    }
+    return check->checkImage(uri, target, options, values);
+}
+
+TEST_F(MethodsTest, TheCheckInProcessAnswersAsTheInstallDoesAndClaimsNothing) {
+    setClaim("eth1");  // an update runs, and is not disturbed
+    unsigned checked = 0;
+    for (const std::vector<Row>& rows : {argumentRows(), uriRows(), resolutionRows()}) {
+        for (const Row& row : rows) {
+            if (row.call.method != "InstallFromURI" || row.returnValue == kThrows) continue;
+            const bool isInstallable = row.returnValue == kJobStarted || !row.claimed.empty();
+            EXPECT_EQ(checkedInProcess(service(), row.call), isInstallable ? 0 : row.returnValue)
+                << (row.lines.empty() ? "" : row.lines[0]);
+            EXPECT_EQ(claim(), "eth1");
+            ++checked;
+        }
+    }
+    EXPECT_GT(checked, 20U);
+    EXPECT_TRUE(m_requests.enumerateInstances("Quenx_ConcreteJob").empty());
+    EXPECT_EQ(test::componentsOf("eth0"), "IMG_PXE 1, IMG_UEFI 0");
 }
 
 TEST_F(MethodsTest, WhatCannotBeLookedUpIsNotFound) {

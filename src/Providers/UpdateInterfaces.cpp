@@ -1,0 +1,8 @@
+#include "Providers/UpdateInterfaces.h"
+
+namespace update {
+
+// Here, in a library below all providers, so that the type's information has one home.
+ImageCheck::~ImageCheck() = default;
+
+}  // namespace update
