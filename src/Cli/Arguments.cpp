@@ -163,9 +163,12 @@ void addAssociators(CLI::App& app, Arguments& arguments) {
 }
 
 void addDelete(CLI::App& app, Arguments& arguments) {
-    CLI::App* verb = app.add_subcommand("delete", "Delete a job on a server; its update goes on");
+    CLI::App* verb =
+        app.add_subcommand("delete", "Delete a job from the list of a server; its update continues");
     auto job = std::make_shared<std::string>();
-    verb->add_option("job", *job, "Job, as \"jobs\" lists it")->type_name("JOB")->required();
+    verb->add_option("job", *job, "Job: its id as \"jobs\" lists it, or the number at its end")
+        ->type_name("JOB")
+        ->required();
     verb->callback(
         [job, &arguments] { arguments.verb = [job](Context& context) { return deleteJob(context, *job); }; });
 }

@@ -4,7 +4,6 @@
 
 #include "Cli/Job.h"
 #include "Cli/ReturnValues.h"
-#include "Cli/Values.h"
 
 namespace cli {
 
@@ -13,12 +12,6 @@ namespace {
 constexpr const char* WAIT_OR_RESTART =
     "An update ends by itself: try again in a while. What a check holds stays until quenx-cimd is restarted; "
     "with \"ReleaseClaimAfterCheck=1\" in the configuration file of its providers a check holds nothing.";
-
-std::string adapterOf(Management& management, const JobView& job) {
-    const auto ports =
-        management.associators(job.path, {"Quenx_AffectedJobElement", "Quenx_EthernetPort", "", ""});
-    return ports.empty() ? "An adapter" : textOf(ports.front(), "Name");
-}
 
 std::optional<JobView> runningJob(Management& management) {
     const std::vector<JobView> jobs = readJobs(management);
@@ -47,7 +40,7 @@ Explanation explainBusyness(Management& management, std::uint32_t returnValue, c
     if (!mayBeBusy || management.runsJobs()) return {};
     const std::optional<JobView> job = runningJob(management);
     if (!job) return explainUnseen(returnValue, candidate);
-    return {adapterOf(management, *job) + " is being updated: " + job->id + ", " +
+    return {(job->adapter.empty() ? "An adapter" : job->adapter) + " is being updated: " + job->id + ", " +
                 std::to_string(job->certainPercent().value_or(0)) +
                 " % done. The server updates one adapter at a time.",
             "Wait for that update to end and try again; \"quenxctl jobs\" shows how far it is."};

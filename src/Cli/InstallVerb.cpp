@@ -63,6 +63,7 @@ void followUpdate(Context& context, const core::CimPath& job, const Candidate& c
                   InstallOutcome& outcome) {
     context.observer.started(candidate.adapter.name, candidate.comparison ? candidate.comparison->bytes : 0);
     outcome.job = followJob(context.management, job, context.observer, context.following);
+    outcome.job->adapter = candidate.adapter.name;
     outcome.after = readComponents(context.management, candidate.adapter.path);
     judgeJob(outcome, candidate);
 }

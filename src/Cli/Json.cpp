@@ -48,8 +48,12 @@ Json toJson(const std::vector<Component>& components) {
 }
 
 Json toJson(const JobView& job) {
+    const auto orNull = [](const std::string& text) { return text.empty() ? Json() : Json(text); };
     return {{"path", job.path.toString()},
             {"id", job.id},
+            {"adapter", orNull(job.adapter)},
+            {"startTime", job.start ? Json(core::scalarText(core::CimType::Datetime, *job.start)) : Json()},
+            {"user", orNull(job.user)},
             {"state", job.state},
             {"stateName", jobStateName(job.state)},
             {"percentComplete", job.percent},

@@ -12,11 +12,11 @@ const core::CimValue* valueOf(const core::InstanceValue& instance, std::string_v
 }
 
 template <class T>
-T scalarOf(const core::InstanceValue& instance, std::string_view property) {
+std::optional<T> scalarOf(const core::InstanceValue& instance, std::string_view property) {
     const core::CimValue* value = valueOf(instance, property);
     const core::CimScalar* scalar = value == nullptr ? nullptr : value->scalar();
     const T* held = scalar == nullptr ? nullptr : std::get_if<T>(scalar);
-    return held == nullptr ? T{} : *held;
+    return held == nullptr ? std::nullopt : std::optional<T>(*held);
 }
 
 template <class T>
@@ -49,11 +49,15 @@ std::string displayScalar(core::CimType type, const core::CimScalar& value) {
 }  // namespace
 
 std::string textOf(const core::InstanceValue& instance, std::string_view property) {
-    return scalarOf<std::string>(instance, property);
+    return scalarOf<std::string>(instance, property).value_or("");
 }
 
 std::uint64_t numberOf(const core::InstanceValue& instance, std::string_view property) {
-    return scalarOf<std::uint64_t>(instance, property);
+    return scalarOf<std::uint64_t>(instance, property).value_or(0);
+}
+
+std::optional<utils::Time> timeOf(const core::InstanceValue& instance, std::string_view property) {
+    return scalarOf<utils::Time>(instance, property);
 }
 
 std::vector<std::string> textsOf(const core::InstanceValue& instance, std::string_view property) {

@@ -1,6 +1,7 @@
 #pragma once
 
 #include <cstdint>
+#include <optional>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -12,6 +13,8 @@
 namespace cli {
 
 std::string textOf(const core::InstanceValue& instance, std::string_view property);
+/// Nothing for a property that holds no datetime.
+std::optional<utils::Time> timeOf(const core::InstanceValue& instance, std::string_view property);
 std::uint64_t numberOf(const core::InstanceValue& instance, std::string_view property);
 std::vector<std::string> textsOf(const core::InstanceValue& instance, std::string_view property);
 std::vector<std::uint64_t> numbersOf(const core::InstanceValue& instance, std::string_view property);

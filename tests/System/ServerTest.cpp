@@ -43,7 +43,13 @@ TEST_F(Server, UpdatesAndKeepsTheJob) {
     const auto jobs = nlohmann::json::parse(quenxctl({"jobs", "--json"}).out)["jobs"];
     ASSERT_EQ(jobs.size(), 1U);
     EXPECT_EQ(jobs[0]["state"], 7);
-    EXPECT_EQ(quenxctl({"delete", jobs[0]["id"]}).status, 0);
+    EXPECT_EQ(jobs[0]["adapter"], "eth0");
+    EXPECT_EQ(jobs[0]["user"], nullptr);
+    const std::string day = jobs[0].value("startTime", "none").substr(0, 4);
+    const std::string table = quenxctl({"jobs"}).out;
+    EXPECT_TRUE(contains(table, "Job#1  eth0     Completed  100      " + day + "-")) << table;
+    EXPECT_EQ(quenxctl({"delete", "0"}).status, 1);
+    EXPECT_EQ(quenxctl({"delete", "1"}).status, 0);
     EXPECT_EQ(quenxctl({"delete", jobs[0]["id"]}).status, 1);
     EXPECT_TRUE(nlohmann::json::parse(quenxctl({"jobs", "--json"}).out)["jobs"].empty());
 }
@@ -62,7 +68,7 @@ TEST_F(Server, SaysWhoHoldsTheAdapters) {
     expectRefusal("eth0", "eth0 is being updated: Quenx:FirmwareUpdate@Job#1, ");
     expectRefusal("eth1", "eth0 is being updated: Quenx:FirmwareUpdate@Job#1, ");
     const std::string deleted = quenxctl({"delete", "Quenx:FirmwareUpdate@Job#1"}).out;
-    EXPECT_TRUE(contains(deleted, "The update goes on to its end and can no longer be followed")) << deleted;
+    EXPECT_TRUE(contains(deleted, "Its update continues, but can no longer be followed")) << deleted;
     EXPECT_TRUE(contains(first.finish().error, "it was deleted"));
     expectRefusal("eth0", "No job is running, yet the server holds eth0 for an earlier check, or ");
     expectRefusal("eth1", "or it holds another adapter than eth1 for an earlier check, or ");
