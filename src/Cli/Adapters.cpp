@@ -1,9 +1,9 @@
 #include "Cli/Adapters.h"
 
 #include <algorithm>
-#include <optional>
 
 #include "Cli/Failure.h"
+#include "Cli/Suggestion.h"
 #include "Cli/Values.h"
 #include "Utils/Utils.h"
 
@@ -36,16 +36,25 @@ Adapter readAdapter(Management& management, const core::InstanceValue& port) {
     return adapter;
 }
 
-std::string namesOf(const std::vector<Adapter>& adapters) {
-    std::string names;
-    for (const Adapter& adapter : adapters)
-        names += (names.empty() ? "" : ", ") + adapter.name;
-    return names;
+/// Without the domain that "lspci -D" prints and the model leaves out.
+std::string_view withoutDomain(std::string_view pciAddress) {
+    constexpr std::string_view FIRST_DOMAIN = "0000:";
+    if (pciAddress.starts_with(FIRST_DOMAIN)) pciAddress.remove_prefix(FIRST_DOMAIN.size());
+    return pciAddress;
 }
 
 bool isMeant(const Adapter& adapter, const std::string& target, const std::optional<core::CimPath>& path) {
-    return adapter.name == target || (!adapter.pciAddress.empty() && adapter.pciAddress == target) ||
+    const std::string_view address = withoutDomain(adapter.pciAddress);
+    return adapter.name == target || (!address.empty() && core::sameName(address, withoutDomain(target))) ||
            (path && adapter.path.names(*path));
+}
+
+Failure unknownAdapter(const std::string& target, const std::vector<Adapter>& adapters) {
+    std::vector<std::string> names;
+    for (const Adapter& adapter : adapters)
+        names.push_back(adapter.name);
+    return {ExitStatus::NotFound, "There is no adapter \"" + target + "\".",
+            didYouMean(target, names) + "The adapters are " + listText(names) + "."};
 }
 
 }  // namespace
@@ -74,7 +83,7 @@ Adapter findAdapter(Management& management, const std::string& target) {
     const std::vector<Adapter> adapters = readAdapters(management);
     if (adapters.empty()) {
         throw Failure(
-            ExitStatus::Failed, "There are no adapters.",
+            ExitStatus::NotFound, "There are no adapters.",
             management.runsJobs() ? "Describe simulated ones in a file and name it with --adapters." : "");
     }
     const core::CimPath asPath(target);
@@ -83,8 +92,13 @@ Adapter findAdapter(Management& management, const std::string& target) {
     const auto found = std::find_if(adapters.begin(), adapters.end(),
                                     [&](const Adapter& adapter) { return isMeant(adapter, target, path); });
     if (found != adapters.end()) return *found;
-    throw Failure(ExitStatus::Failed, "There is no adapter \"" + target + "\".",
-                  "Name one of these: " + namesOf(adapters) + ".");
+    throw unknownAdapter(target, adapters);
+}
+
+std::optional<std::uint32_t> versionOf(const std::vector<Component>& components, std::string_view type) {
+    const auto found = std::find_if(components.begin(), components.end(),
+                                    [type](const Component& component) { return component.type == type; });
+    return found == components.end() ? std::nullopt : std::optional(found->version);
 }
 
 std::string componentsText(const std::vector<Component>& components) {

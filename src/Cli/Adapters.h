@@ -1,7 +1,9 @@
 #pragma once
 
 #include <cstdint>
+#include <optional>
 #include <string>
+#include <string_view>
 #include <vector>
 
 #include "Cli/Management.h"
@@ -33,9 +35,12 @@ std::vector<Adapter> readAdapters(Management& management);
 /// What is installed on a port.
 std::vector<Component> readComponents(Management& management, const core::CimPath& port);
 
-/// The adapter that a user means: by its name, its PCI address, or the text of its object path. Throws
-/// Failure that names the adapters there are.
+/// The adapter that a user means: by its name, its PCI address with or without the domain, or the text of its
+/// object path. Throws Failure that names the adapters there are.
 Adapter findAdapter(Management& management, const std::string& target);
+
+/// The version of the component of this type; nothing where there is none.
+std::optional<std::uint32_t> versionOf(const std::vector<Component>& components, std::string_view type);
 
 /// "IMG_PXE 1, IMG_UEFI 0"; "nothing" for none.
 std::string componentsText(const std::vector<Component>& components);

@@ -2,10 +2,12 @@
 
 #include <CLI/CLI.hpp>
 #include <algorithm>
+#include <iostream>
 #include <memory>
 #include <string_view>
 
 #include "Cli/Failure.h"
+#include "Cli/Suggestion.h"
 #include "Utils/Utils.h"
 
 #ifndef QUENX_VERSION
@@ -19,9 +21,13 @@ namespace {
 constexpr const char* FOOTER =
     "Exit status:\n"
     "  0  done\n"
-    "  1  failed: the message says what happened and what to do next\n"
+    "  1  failed or refused: the message says what happened and what to do next\n"
     "  2  wrong use: the command line itself is wrong, or a file that an option names cannot be used\n"
-    "  3  already current: what was to be installed is what is installed (see --force)\n";
+    "  3  already current: what was to be installed is what is installed (see --force)\n"
+    "  4  not found: there is no such adapter, identity, job, class or instance\n";
+
+constexpr const char* TARGET_TEXT = "Adapter: its name, PCI address or object path";
+constexpr const char* IDENTITY_TEXT = "Image: a software identity that \"identities\" lists";
 
 std::vector<std::string> typesOf(std::string text) {
     utils::replaceCharacter(text, '+', ',');
@@ -36,21 +42,22 @@ void addServerOptions(CLI::App& app, Arguments& arguments, const std::vector<CLI
     CLI::Option* url =
         app.add_option_function<std::string>(
                "--server", [&arguments](const std::string& text) { arguments.serverUrl.emplace(text); },
-               "Work on a WBEM server, https://host:5989, and not in this process; images are "
-               "then files of that host")
+               "Use a WBEM server (https://host:5989) instead of this process; images are then files on "
+               "that host")
             ->type_name("URL");
     for (CLI::Option* option : localOptions)
         option->excludes(url);
     app.add_option("--user", server.user,
-                   "User on the server; the password is asked for, or taken from QUENXCTL_PASSWORD")
+                   "User on the server; the password is taken from QUENXCTL_PASSWORD or asked for")
         ->envname("QUENXCTL_USER")
         ->type_name("NAME");
     app.add_option("--namespace", server.namespaceName, "Namespace on the server")
         ->type_name("NAME")
         ->capture_default_str();
-    CLI::Option* trusted =
-        app.add_option("--cacert", server.caFile, "Certificates to trust")->type_name("FILE")->needs(url);
-    app.add_flag("--insecure", server.insecure, "Take any certificate: anybody could be the server")
+    CLI::Option* trusted = app.add_option("--cacert", server.caFile, "Trust the certificates in this file")
+                               ->type_name("FILE")
+                               ->needs(url);
+    app.add_flag("--insecure", server.insecure, "Accept any server certificate: for tests only")
         ->needs(url)
         ->excludes(trusted);
 }
@@ -62,16 +69,19 @@ void addCommonOptions(CLI::App& app, Arguments& arguments) {
         app.add_option("--config", arguments.local.configFile,
                        "Configuration file of the providers (default: /etc/quenx-cimprovider.conf)")
             ->type_name("FILE");
-    CLI::Option* adapters =
-        app.add_option("--adapters", arguments.local.adapterDescription, "Description of simulated adapters")
-            ->type_name("FILE");
-    app.add_option("--state", arguments.local.stateDirectory,
-                   "Where simulated adapters keep their flash (default: beside their description)")
+    CLI::Option* adapters = app.add_option("--adapters", arguments.local.adapterDescription,
+                                           "Description of simulated adapters (default: QUENX_ADAPTERS, else "
+                                           "/etc/quenx-adapters.toml)")
+                                ->type_name("FILE");
+    app.add_option(
+           "--state", arguments.local.stateDirectory,
+           "Where the simulated adapters of --adapters keep their flash (default: QUENX_ADAPTER_STATE, "
+           "else beside FILE, with the extension .state)")
         ->type_name("DIR")
         ->needs(adapters);
     CLI::Option* providers =
         app.add_option("--providers", arguments.local.providerDirectory,
-                       "Directory of the provider libraries (default: those that belong to this program)")
+                       "Directory of the provider libraries (default: those installed with this program)")
             ->type_name("DIR");
     addServerOptions(app, arguments, {config, adapters, providers});
 }
@@ -82,27 +92,26 @@ void requireOneImage(const CLI::App& verb, const CLI::Option* file, const CLI::O
     throw CLI::ValidationError(verb.get_name(), "name one image, either as a file or with --identity");
 }
 
+CLI::Option* addTypes(CLI::App& verb, std::string& types) {
+    return verb
+        .add_option("--types", types,
+                    "Image types to install, separated by commas (default: all in the image)")
+        ->type_name("TYPES");
+}
+
 void addInstall(CLI::App& app, Arguments& arguments) {
     CLI::App* verb =
-        app.add_subcommand("install", "Install a firmware image on an adapter and wait for the end");
+        app.add_subcommand("install", "Install a firmware image on an adapter and wait until it is done");
+    verb->alias("update");
     auto order = std::make_shared<InstallOrder>();
     auto types = std::make_shared<std::string>();
-    verb->add_option("--target", order->target, "Adapter: its name, PCI address or object path")
-        ->type_name("ADAPTER")
-        ->required();
+    verb->add_option("--target", order->target, TARGET_TEXT)->type_name("ADAPTER")->required();
     CLI::Option* image =
         verb->add_option("image", order->image, "Image: a path or a file URI")->type_name("URI");
-    CLI::Option* identity = verb->add_option("--identity", order->identity,
-                                             "Image: a software identity that \"identities\" lists")
-                                ->type_name("ID");
-    verb->add_option("--types", *types,
-                     "Image types to install, separated by commas (default: all in the image)")
-        ->type_name("TYPES")
-        ->excludes(identity);
-    verb->add_flag("--force", order->force, "Install an older image too, and one that is installed already");
-    verb->footer(
-        "An update that has begun always runs to its end: Ctrl-C does not stop it, the program waits for "
-        "it.");
+    CLI::Option* identity = verb->add_option("--identity", order->identity, IDENTITY_TEXT)->type_name("ID");
+    addTypes(*verb, *types)->excludes(identity);
+    verb->add_flag("--force", order->force, "Also install an older image, or the same one again");
+    verb->footer("An update that has begun always runs to its end: Ctrl-C does not stop it.");
     verb->callback([=, &arguments] {
         requireOneImage(*verb, image, identity);
         if (!types->empty()) order->types = typesOf(*types);
@@ -144,18 +153,19 @@ void addInstances(CLI::App& app, Arguments& arguments) {
 }
 
 void addAssociators(CLI::App& app, Arguments& arguments) {
-    CLI::App* verb = app.add_subcommand("associators", "List what is associated with an instance");
+    CLI::App* verb = app.add_subcommand("associators", "List the instances associated with an instance");
     auto order = std::make_shared<AssociatorsOrder>();
     verb->add_option("path", order->path, "Object path, as \"instances CLASS --names\" prints it")
         ->type_name("PATH")
         ->required();
-    verb->add_option("--class", order->filter.associationClass, "Only by associations of this class")
+    verb->add_option("--class", order->filter.associationClass, "Only through associations of this class")
         ->type_name("CLASS");
     verb->add_option("--result-class", order->filter.resultClass, "Only instances of this class")
         ->type_name("CLASS");
     verb->add_option("--role", order->filter.role, "Only where the instance has this role")
         ->type_name("ROLE");
-    verb->add_option("--result-role", order->filter.resultRole, "Only what has this role")->type_name("ROLE");
+    verb->add_option("--result-role", order->filter.resultRole, "Only instances with this role")
+        ->type_name("ROLE");
     verb->add_flag("--names", order->namesOnly, "Only their object paths");
     verb->callback([order, &arguments] {
         arguments.verb = [order](Context& context) { return showAssociators(context, *order); };
@@ -178,18 +188,46 @@ void addPlainVerb(CLI::App& app, Arguments& arguments, const char* name, const c
     app.add_subcommand(name, description)->callback([verb, &arguments] { arguments.verb = verb; });
 }
 
-/// The library only says that a verb is missing where one is not known.
-std::string reasonOf(const CLI::App& app, const CLI::ParseError& error) {
-    const std::vector<std::string> rest = app.remaining();
-    const bool isUnknownVerb =
-        error.get_name() == "RequiredError" && !rest.empty() && app.get_subcommands().empty();
-    return isUnknownVerb ? "There is no verb \"" + rest.front() + "\"." : std::string(error.what()) + ".";
+constexpr const char* ASK_HELP = "\"quenxctl --help\" lists the verbs and options.";
+
+std::vector<const CLI::App*> verbsOf(const CLI::App& app) {
+    return app.get_subcommands([](const CLI::App*) { return true; });
 }
 
-std::string helpAdvice(const CLI::App& app) {
+Failure unknownVerb(const CLI::App& app, const std::string& name) {
+    std::vector<std::string> names;
+    for (const CLI::App* verb : verbsOf(app)) {
+        names.push_back(verb->get_name());
+        names.insert(names.end(), verb->get_aliases().begin(), verb->get_aliases().end());
+    }
+    return {ExitStatus::WrongUse, "There is no verb \"" + name + "\".", didYouMean(name, names) + ASK_HELP};
+}
+
+/// The library only says that a verb is missing, both where there is none and where it is unknown.
+Failure wrongUse(const CLI::App& app, const CLI::ParseError& error) {
     const auto verbs = app.get_subcommands();
-    return verbs.empty() ? "\"quenxctl --help\" lists the verbs and options."
-                         : "\"quenxctl " + verbs.front()->get_name() + " --help\" lists what it takes.";
+    if (!verbs.empty()) {
+        return {ExitStatus::WrongUse, std::string(error.what()) + ".",
+                "\"quenxctl help " + verbs.front()->get_name() + "\" lists what it takes."};
+    }
+    const std::vector<std::string> rest = app.remaining();
+    if (error.get_name() != "RequiredError")
+        return {ExitStatus::WrongUse, error.what() + std::string("."), ASK_HELP};
+    return rest.empty() ? Failure(ExitStatus::WrongUse, "No verb was given.", ASK_HELP)
+                        : unknownVerb(app, rest.front());
+}
+
+/// Prints the help of the program, or with a name that of a verb.
+void printHelp(const CLI::App& app, const std::string& name) {
+    // Not App::help(): once a verb was read, that gives the help of the verb.
+    const auto print = [](const CLI::App& asked, const std::string& title) {
+        std::cout << asked.get_formatter()->make_help(&asked, title, CLI::AppFormatMode::Normal);
+    };
+    if (name.empty()) return print(app, app.get_name());
+    for (const CLI::App* verb : verbsOf(app)) {
+        if (verb->check_name(name)) return print(*verb, app.get_name() + " " + verb->get_name());
+    }
+    throw unknownVerb(app, name);
 }
 
 }  // namespace
@@ -211,14 +249,24 @@ std::optional<Arguments> readArguments(int argc, char** argv) {
     addInstances(app, arguments);
     addAssociators(app, arguments);
     addPlainVerb(app, arguments, "mof", "Print the schema of all served classes as MOF", showMof);
+    std::string helpOf;
+    CLI::App* help = app.add_subcommand("help", "Print this help, or that of a verb");
+    help->add_option("verb", helpOf, "Verb")->type_name("VERB");
+    for (CLI::App* verb : app.get_subcommands({}))
+        verb->group("Verbs");
+    app.get_formatter()->label("SUBCOMMAND", "VERB");
     app.footer(FOOTER);  // last: verbs take over the footer that is there when they are added
     try {
         app.parse(argc, argv);
     } catch (const CLI::ParseError& error) {
         if (error.get_exit_code() != 0) {
-            throw Failure(ExitStatus::WrongUse, reasonOf(app, error), helpAdvice(app));
+            throw wrongUse(app, error);
         }
         app.exit(error);
+        return std::nullopt;
+    }
+    if (help->parsed()) {
+        printHelp(app, helpOf);
         return std::nullopt;
     }
     return arguments;

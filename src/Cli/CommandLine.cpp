@@ -61,6 +61,11 @@ std::string adviceFor(core::CimStatus status) {
     }
 }
 
+ExitStatus statusFor(core::CimStatus status) {
+    const bool isMissing = status == core::CimStatus::NotFound || status == core::CimStatus::InvalidClass;
+    return isMissing ? ExitStatus::NotFound : ExitStatus::Failed;
+}
+
 /// An error text of the model or a server, which may be no more than a few words, as a sentence.
 std::string sentence(std::string text) {
     if (text.empty()) return "The service gave no reason.";
@@ -104,7 +109,7 @@ ExitStatus runAndReport(int argc, char** argv, std::optional<Arguments>& argumen
     } catch (const Failure& failure) {
         return report(json, failure.status(), failure.what(), failure.advice());
     } catch (const core::CimError& error) {
-        return report(json, ExitStatus::Failed, sentence(error.what()), adviceFor(error.status()));
+        return report(json, statusFor(error.status()), sentence(error.what()), adviceFor(error.status()));
     } catch (const std::exception& error) {
         return report(json, ExitStatus::Failed, sentence(error.what()), ASK_LOG);
     }

@@ -56,10 +56,10 @@ Identity findIdentity(Management& management, const std::string& id) {
     for (Identity& identity : readIdentities(management)) {
         if (identity.id != id) continue;
         if (identity.isInstallable()) return identity;
-        throw Failure(ExitStatus::Failed,
+        throw Failure(ExitStatus::NotFound,
                       "\"" + id + "\" is installed on an adapter; there is no file of it.", ASK_INVENTORY);
     }
-    throw Failure(ExitStatus::Failed, "There is no software identity \"" + id + "\".", ASK_INVENTORY);
+    throw Failure(ExitStatus::NotFound, "There is no software identity \"" + id + "\".", ASK_INVENTORY);
 }
 
 Identity findIdentityOfFile(Management& management, const std::string& file) {
@@ -69,7 +69,7 @@ Identity findIdentityOfFile(Management& management, const std::string& file) {
                                       [&](const std::string& uri) { return isSameFile(uri, wanted); });
         if (isIt) return identity;
     }
-    throw Failure(ExitStatus::Failed, "The inventory does not offer " + file + ".", ASK_INVENTORY);
+    throw Failure(ExitStatus::NotFound, "The inventory does not offer " + file + ".", ASK_INVENTORY);
 }
 
 }  // namespace cli

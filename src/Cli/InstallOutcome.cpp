@@ -1,7 +1,5 @@
 #include "Cli/InstallOutcome.h"
 
-#include <algorithm>
-
 #include "Cli/Json.h"
 #include "Cli/Terminal.h"
 #include "Cli/TextTable.h"
@@ -21,16 +19,15 @@ Json outcomeToJson(const InstallOutcome& outcome) {
     return json;
 }
 
-std::string versionOf(const std::vector<Component>& components, const std::string& type) {
-    const auto at = std::find_if(components.begin(), components.end(),
-                                 [&](const Component& component) { return component.type == type; });
-    return at == components.end() ? "none" : std::to_string(at->version);
+std::string versionText(const std::vector<Component>& components, const std::string& type) {
+    const auto version = versionOf(components, type);
+    return version ? std::to_string(*version) : "none";
 }
 
 void printChange(std::ostream& out, const InstallOutcome& outcome) {
     std::vector<std::vector<std::string>> rows;
     for (const Component& component : outcome.after) {
-        rows.push_back({"  " + component.type, versionOf(outcome.before, component.type) + " -> " +
+        rows.push_back({"  " + component.type, versionText(outcome.before, component.type) + " -> " +
                                                    std::to_string(component.version)});
     }
     printTable(out, rows);

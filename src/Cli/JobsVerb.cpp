@@ -85,7 +85,8 @@ ExitStatus deleteJob(Context& context, const std::string& id) {
         printDeleted(context, job);
         return ExitStatus::Done;
     }
-    throw Failure(ExitStatus::Failed, "There is no job \"" + id + "\".", "\"quenxctl jobs\" lists the jobs.");
+    throw Failure(ExitStatus::NotFound, "There is no job \"" + id + "\".",
+                  "\"quenxctl jobs\" lists the jobs.");
 }
 
 }  // namespace cli

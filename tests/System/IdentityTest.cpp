@@ -69,9 +69,9 @@ TEST_F(Identities, RefusalsSayWhatToDo) {
     } rows[] = {
         {{"check", "--target", "eth0", "--identity", other}, 1, "is for 10ec:8139, and eth0 is 1af4:1041."},
         {{"install", "--target", "eth0", "--identity", other}, 1, "is for 10ec:8139, and eth0 is 1af4:1041."},
-        {{"check", "--target", "eth0", "--identity", "none"}, 1, "There is no software identity \"none\"."},
-        {{"check", "--target", "eth0", "--identity", idOf("eth0")}, 1, "there is no file of it"},
-        {{"check", "--target", "eth0", image_}, 1, "put its directory into the line \"FWFilePath=\""},
+        {{"check", "--target", "eth0", "--identity", "none"}, 4, "There is no software identity \"none\"."},
+        {{"check", "--target", "eth0", "--identity", idOf("eth0")}, 4, "there is no file of it"},
+        {{"check", "--target", "eth0", image_}, 4, "put its directory into the line \"FWFilePath=\""},
         {{"check", "--target", "eth3", "--identity", idOf("1af4-1041")}, 1, "cannot be updated"},
         {{"install", "--target", "eth0", "--identity", other, "--types", "IMG_PXE"}, 2, "excludes --types"},
     };

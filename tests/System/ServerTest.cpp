@@ -48,9 +48,9 @@ TEST_F(Server, UpdatesAndKeepsTheJob) {
     const std::string day = jobs[0].value("startTime", "none").substr(0, 4);
     const std::string table = quenxctl({"jobs"}).out;
     EXPECT_TRUE(contains(table, "Job#1  eth0     Completed  100      " + day + "-")) << table;
-    EXPECT_EQ(quenxctl({"delete", "0"}).status, 1);
+    EXPECT_EQ(quenxctl({"delete", "0"}).status, 4);
     EXPECT_EQ(quenxctl({"delete", "1"}).status, 0);
-    EXPECT_EQ(quenxctl({"delete", jobs[0]["id"]}).status, 1);
+    EXPECT_EQ(quenxctl({"delete", jobs[0]["id"]}).status, 4);
     EXPECT_TRUE(nlohmann::json::parse(quenxctl({"jobs", "--json"}).out)["jobs"].empty());
 }
 
@@ -103,7 +103,7 @@ TEST_F(Server, ShowsTheSameModelAsInProcess) {
         EXPECT_EQ(comparable(quenxctl(arguments).out), comparable(expected)) << arguments[0];
     }
     const ProgramResult unknown = quenxctl({"instances", "No_<&>\"Such"});
-    EXPECT_EQ(unknown.status, 1);
+    EXPECT_EQ(unknown.status, 4);
     EXPECT_TRUE(contains(unknown.error, "No_<&>\"Such")) << unknown.error;
 }
 

@@ -38,7 +38,7 @@ TEST_F(Update, WritesTheImageAndSaysWhatChanged) {
                           "eth3  05:00.0  1022:2000  no         IMG_PXE 1                \n"))
         << table;
 
-    const ProgramResult again = test::run(install("03:00.0"));
+    const ProgramResult again = test::run(install("0000:03:00.0"));
     EXPECT_EQ(again.status, 3);
     EXPECT_EQ(again.out,
               "eth0 is already current: it has IMG_PXE 2, IMG_UEFI 2, as the image does.\n"

@@ -71,18 +71,24 @@ TEST_F(WrongUse, OtherAdaptersAndNames) {
         std::string part;
     } rows[] = {
         {{"install", "--target", "eth3", image_}, 1, "The firmware of eth3 cannot be updated."},
-        {{"install", "--target", "eth7", image_}, 1, "Name one of these: eth0, eth1, eth2, eth3, eth4."},
-        {{"install", "--target", "X.A=\"\\\"\\\\", image_}, 1, "There is no adapter \"X.A="},
-        {{"install", "--target", "X.A=", image_}, 1, "There is no adapter \"X.A=\"."},
+        {{"install", "--target", "eth7", image_},
+         4,
+         "\"eth7\".\nThe adapters are eth0, eth1, eth2, eth3, eth4."},
+        {{"install", "--target", "EHT2", image_}, 4, "\"EHT2\".\nDid you mean eth2? The adapters are eth0, "},
+        {{"install", "--target", "0001:03:00.0", image_}, 4, "There is no adapter \"0001:03:00.0\"."},
+        {{"install", "--target", "X.A=\"\\\"\\\\", image_}, 4, "There is no adapter \"X.A="},
+        {{"install", "--target", "X.A=", image_}, 4, "There is no adapter \"X.A=\"."},
         {{"install", "--target", "eth0", image_, "--types", "IMG_FCoE"}, 1, "The image holds no IMG_FCoE."},
         {{"install", "--target", "eth0", image_, "--types", "img_pxe"}, 2, "\"img_pxe\" is no image type."},
         {{"install", "--target", "eth0", image_, "--types", "IMG_X"}, 2, "IMG_FCoE, written just so."},
         {{"install", "--target", "eth0"}, 2, "name one image"},
         {{"install", "--target", "eth0", image_, "--identity", "x"}, 2, "name one image"},
         {{"install", image_}, 2, "--target is required"},
-        {{"frobnicate"}, 2, "frobnicate"},
-        {{}, 2, "A subcommand is required"},
-        {{"instances", "No_Such"}, 1, "\"quenxctl mof\" prints the classes"},
+        {{"frobnicate"}, 2, "There is no verb \"frobnicate\".\n\"quenxctl --help\" lists"},
+        {{"isntall"}, 2, "There is no verb \"isntall\".\nDid you mean install? "},
+        {{"help", "jbos"}, 2, "There is no verb \"jbos\".\nDid you mean jobs? "},
+        {{}, 2, "No verb was given."},
+        {{"instances", "No_Such"}, 4, "\"quenxctl mof\" prints the classes"},
         {{"adapters", "--server", ""}, 2, "--server \"\" does not begin with https:// or http://."},
         {{"adapters", "--server", "127.0.0.1:5989"}, 2, "Write it as https://host:5989."},
         {{"adapters", "--server", "https://a:b@host"}, 2, "Name the user with --user"},
@@ -111,9 +117,9 @@ TEST_F(WrongUse, JsonIsOneDocumentAlsoForErrors) {
         {{"instances", "Quenx_EthernetPort"}, 0, "/instances/0/class", "Quenx_EthernetPort"},
         {{"instances", "Quenx_EthernetPort", "--names"}, 0, "/paths/5", nullptr},
         {{"identities"}, 0, "/identities/0/file", nullptr},
-        {{"instances", "No_Such"}, 1, "/exitStatus", 1},
+        {{"instances", "No_Such"}, 4, "/exitStatus", 4},
         {{"frobnicate"}, 2, "/error", "There is no verb \"frobnicate\"."},
-        {{"install", "--target", "eth9", image_}, 1, "/error", "There is no adapter \"eth9\"."},
+        {{"install", "--target", "eth9", image_}, 4, "/error", "There is no adapter \"eth9\"."},
         {{"install", "--target", "eth3", image_}, 1, "/returnValue", 4097},
         {{"install", "--target", "eth0", image_}, 0, "/job/state", 7},
         {{"install", "--target", "eth0", image_}, 3, "/result", "already current"},
@@ -130,8 +136,12 @@ TEST_F(WrongUse, JsonIsOneDocumentAlsoForErrors) {
     }
 }
 
-TEST_F(WrongUse, HelpDocumentsTheExitStatuses) {
-    EXPECT_TRUE(test::contains(quenxctl({"--help"}).out, "3  already current"));
+TEST_F(WrongUse, HelpIsAVerbAndAnOption) {
+    const std::string help = quenxctl({"help"}).out;
+    EXPECT_EQ(help, quenxctl({"--help"}).out);
+    for (const char* part : {"install, update", "3  already current", "4  not found"})
+        EXPECT_TRUE(test::contains(help, part)) << help;
+    EXPECT_EQ(quenxctl({"help", "update"}).out, quenxctl({"install", "--help"}).out);
 }
 
 }  // namespace
