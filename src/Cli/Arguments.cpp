@@ -24,7 +24,7 @@ constexpr const char* FOOTER =
     "  1  failed or refused: the message says what happened and what to do next\n"
     "  2  wrong use: the command line itself is wrong, or a file that an option names cannot be used\n"
     "  3  already current: what was to be installed is what is installed (see --force)\n"
-    "  4  not found: there is no such adapter, identity, job, class or instance\n";
+    "  4  not found: there is no such adapter, image file, identity, job, class or instance\n";
 
 constexpr const char* TARGET_TEXT = "Adapter: its name, PCI address or object path";
 constexpr const char* IDENTITY_TEXT = "Image: a software identity that \"identities\" lists";
@@ -123,19 +123,22 @@ void addInstall(CLI::App& app, Arguments& arguments) {
 void addCheck(CLI::App& app, Arguments& arguments) {
     CLI::App* verb = app.add_subcommand(
         "check",
-        "Say whether an image could be installed; nothing is written (a server may hold the adapter)");
+        "Say whether an image could be installed, without writing it (a server may hold the adapter)");
     auto order = std::make_shared<CheckOrder>();
-    verb->add_option("--target", order->target, "Adapter: its name, PCI address or object path")
-        ->type_name("ADAPTER")
-        ->required();
+    auto types = std::make_shared<std::string>();
+    verb->add_option("--target", order->target, TARGET_TEXT)->type_name("ADAPTER")->required();
     CLI::Option* file =
-        verb->add_option("file", order->file, "Image: a file in a firmware directory of the configuration")
-            ->type_name("FILE");
-    CLI::Option* identity = verb->add_option("--identity", order->identity,
-                                             "Image: a software identity that \"identities\" lists")
-                                ->type_name("ID");
+        verb->add_option("image", order->file,
+                         "Image: a path or a file URI; with --server only one that \"identities\" lists")
+            ->type_name("URI");
+    CLI::Option* identity = verb->add_option("--identity", order->identity, IDENTITY_TEXT)->type_name("ID");
+    addTypes(*verb, *types)->excludes(identity);
+    verb->add_flag("--force", order->force, "Check whether it could be installed with --force")
+        ->excludes(identity);
+    verb->footer("--types and --force cannot be used with --server.");
     verb->callback([=, &arguments] {
         requireOneImage(*verb, file, identity);
+        if (!types->empty()) order->types = typesOf(*types);
         arguments.verb = [order](Context& context) { return check(context, *order); };
     });
 }

@@ -7,7 +7,7 @@ namespace cli {
 ExitStatus showAssociators(Context& context, const AssociatorsOrder& order) {
     const core::CimPath path(order.path);
     if (!path.isInstancePath()) {
-        throw Failure(ExitStatus::WrongUse, "\"" + order.path + "\" is no path of an instance.",
+        throw Failure(ExitStatus::WrongUse, "\"" + order.path + "\" is not the path of an instance.",
                       "Give one as \"quenxctl instances CLASS --names\" prints it, in single quotes.");
     }
     if (order.namesOnly) {

@@ -10,8 +10,8 @@ namespace cli {
 namespace {
 
 constexpr const char* WAIT_OR_RESTART =
-    "An update ends by itself: try again in a while. What a check holds stays until quenx-cimd is restarted; "
-    "with \"ReleaseClaimAfterCheck=1\" in the configuration file of its providers a check holds nothing.";
+    "If an update is running, try again later. If a check holds the adapter, restart the server; with "
+    "\"ReleaseClaimAfterCheck=1\" in the configuration file of its providers, checks hold nothing.";
 
 std::optional<JobView> runningJob(Management& management) {
     const std::vector<JobView> jobs = readJobs(management);
@@ -22,15 +22,15 @@ std::optional<JobView> runningJob(Management& management) {
 
 /// The service holds an adapter, and no job says why.
 Explanation explainUnseen(std::uint32_t returnValue, const Candidate& candidate) {
-    constexpr const char* HOLDER = " for an earlier check, or for an update whose job was deleted.";
+    constexpr const char* HOLDER = ": an earlier check may hold it, or an update whose job was deleted.";
     const std::string& name = candidate.adapter.name;
     if (returnValue == RETURN_TARGET_IN_USE) {
-        return {"No job is running, yet the server holds " + name + HOLDER, WAIT_OR_RESTART};
+        return {"The server refuses " + name + ", although no job is running" + HOLDER, WAIT_OR_RESTART};
     }
     if (candidate.image && !candidate.image->isIntact()) return {};
-    return {
-        "The server could not read or prepare the image, or it holds another adapter than " + name + HOLDER,
-        WAIT_OR_RESTART};
+    return {"The server could not read or prepare the image, or another adapter than " + name + " is in use" +
+                HOLDER,
+            WAIT_OR_RESTART};
 }
 
 }  // namespace
@@ -40,18 +40,17 @@ Explanation explainBusyness(Management& management, std::uint32_t returnValue, c
     if (!mayBeBusy || management.runsJobs()) return {};
     const std::optional<JobView> job = runningJob(management);
     if (!job) return explainUnseen(returnValue, candidate);
-    return {(job->adapter.empty() ? "An adapter" : job->adapter) + " is being updated: " + job->id + ", " +
+    return {(job->adapter.empty() ? "An adapter" : job->adapter) + " is being updated (" + job->id + ", " +
                 std::to_string(job->certainPercent().value_or(0)) +
-                " % done. The server updates one adapter at a time.",
-            "Wait for that update to end and try again; \"quenxctl jobs\" shows how far it is."};
+                " % done). The server updates one adapter at a time.",
+            "Try again when that update has ended; \"quenxctl jobs\" shows its progress."};
 }
 
 std::string holdAfterCheck(const Management& management, const std::string& adapter) {
     if (management.runsJobs()) return {};
-    return "The server now holds " + adapter +
-           ": it refuses further checks and installs until quenx-cimd is restarted, unless the configuration "
-           "file "
-           "of its providers has \"ReleaseClaimAfterCheck=1\".";
+    return "The server may now hold " + adapter +
+           " and refuse further checks and installs until it is restarted. To prevent that, put "
+           "\"ReleaseClaimAfterCheck=1\" into the configuration file of its providers.";
 }
 
 }  // namespace cli

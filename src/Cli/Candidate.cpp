@@ -4,9 +4,9 @@
 
 namespace cli {
 
-Candidate makeCandidate(Adapter adapter, const std::string& uri, std::vector<std::string> types,
+Candidate makeCandidate(Adapter adapter, const std::string& uri, std::vector<std::string> types, bool force,
                         bool sharesFiles) {
-    Candidate candidate{std::move(adapter), uri, std::move(types), std::nullopt, std::nullopt};
+    Candidate candidate{std::move(adapter), uri, std::move(types), force, std::nullopt, std::nullopt};
     const std::optional<std::string> path = localPath(uri);
     if (!path || !sharesFiles) return candidate;
     candidate.image = readFirmwareImage(*path);
@@ -25,7 +25,7 @@ bool isAlreadyCurrent(const Candidate& candidate) {
 
 std::string alreadyCurrentText(const Candidate& candidate) {
     return candidate.adapter.name + " is already current: it has " +
-           componentsText(candidate.comparison->chosen) + ", as the image does.";
+           componentsText(candidate.comparison->chosen) + ".";
 }
 
 }  // namespace cli

@@ -30,13 +30,12 @@ std::unique_ptr<Management> openManagement(const Arguments& arguments) {
     const ServerUrl& url = *arguments.serverUrl;
     ServerSettings server = arguments.server;
     if (!url.isEncrypted() && !url.isLoopback()) {
-        std::cerr << "quenxctl: WARNING: http://: the password and all else is sent in clear. Anybody on the "
-                     "way can read it; write https:// in its place.\n";
+        std::cerr << "quenxctl: WARNING: http:// sends the password and everything else unencrypted. Use "
+                     "https:// instead.\n";
     }
     if (server.insecure) {
         std::cerr << "quenxctl: WARNING: --insecure: the server's certificate is not checked. Anybody on the "
-                     "way can "
-                     "read the password and answer in the server's place.\n";
+                     "network path can read the password and pose as the server.\n";
     }
     if (server.user.empty()) server.user = askUser();
     server.password = passwordOf(server.user);
@@ -55,7 +54,7 @@ std::string adviceFor(core::CimStatus status) {
         case core::CimStatus::InvalidNamespace:
             return "Check --namespace, or the line \"Namespace=\" of the configuration file.";
         case core::CimStatus::ServerIsShuttingDown:
-            return "Try again when it has started anew.";
+            return "Try again after its restart.";
         default:
             return ASK_LOG;
     }
@@ -123,7 +122,7 @@ int runCommandLine(int argc, char** argv) {
     // A result that nobody could read is none; an update, though, is done whoever reads of it.
     const bool mayHaveUpdated = arguments && arguments->startsUpdate;
     if (!std::cout.flush() && !mayHaveUpdated && status == ExitStatus::Done) {
-        std::cerr << "quenxctl: the output could not be written.\n";
+        std::cerr << "quenxctl: Cannot write the output.\n";
         status = ExitStatus::Failed;
     }
     return static_cast<int>(status);

@@ -26,7 +26,7 @@ std::string ask(const std::string& prompt, const std::string& missing, const std
 }  // namespace
 
 std::string askUser() {
-    return ask("User: ", "There is no user name to log in with.",
+    return ask("User: ", "No user name was given.",
                "Name the user with --user or the environment variable QUENXCTL_USER.");
 }
 
@@ -35,7 +35,7 @@ std::string passwordOf(const std::string& user) {
     if (given != nullptr) return given;
     const os::EchoOff silence;
     std::string password =
-        ask("Password for " + user + ": ", "There is no password for " + user + ".",
+        ask("Password for " + user + ": ", "No password was given for " + user + ".",
             "Put it into the environment variable QUENXCTL_PASSWORD, or type it on a terminal.");
     std::cerr << '\n';
     return password;

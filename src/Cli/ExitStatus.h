@@ -8,7 +8,7 @@ enum class ExitStatus {
     Failed = 1,
     WrongUse = 2,
     AlreadyCurrent = 3,  ///< what was to be installed is what is installed
-    NotFound = 4,        ///< what the command line names is not there: an adapter, a job, a class
+    NotFound = 4,        ///< what the command line names is not there: an adapter, a job, an image file
 };
 
 }  // namespace cli

@@ -1,76 +1,123 @@
 #include "Cli/Explanation.h"
 
+#include <algorithm>
+
 #include "Cli/Busyness.h"
 #include "Cli/ImageUri.h"
 #include "Cli/ReturnValues.h"
+#include "Cli/Suggestion.h"
 
 namespace cli {
 
 namespace {
 
 Explanation explainFile(const Candidate& candidate) {
-    if (!candidate.image) {
-        const std::string scheme = uriScheme(candidate.uri);
-        if (localPath(candidate.uri)) return {};  // a file of the server, which only the server sees
-        if (scheme == "file") {
-            return {candidate.uri + " is no well-formed file URI.",
-                    "Write it as file:///directory/file, or give the path alone."};
-        }
-        return {"The service does not read images by \"" + scheme + ":\".",
-                "Copy the image to a local file and name that."};
+    if (candidate.image) return candidate.image->problem.value_or(Explanation());
+    const std::string scheme = uriScheme(candidate.uri);
+    if (localPath(candidate.uri)) return {};  // a file of the server, which only the server sees
+    if (scheme == "file") {
+        return {candidate.uri + " is not a valid file URI.",
+                "Write it as file:///directory/file, or give the path alone."};
     }
-    if (candidate.image->isIntact()) return {};
-    return {candidate.image->path + " " + candidate.image->problem + ".",
-            "Name a file that is a whole firmware image and that the service may read."};
+    return {"The service does not read images over \"" + scheme + ":\".",
+            "Copy the image to a local file and name that."};
 }
 
-/// Why a server takes no file that may well be there for this program.
+/// Why a server refuses a file that may well be there for this program.
 Explanation explainServersFile(const Candidate& candidate) {
     constexpr const char* MOVE =
-        "Put the image where the server may read it; a server that systemd started can have a /tmp of its "
+        "Put the image where the server can read it; a server that systemd started may have a /tmp of its "
         "own.";
     if (candidate.image && candidate.image->isIntact()) {
-        return {"This program can read " + candidate.image->path + ", the server cannot.", MOVE};
+        return {"The server did not accept " + candidate.image->path + ", which this program can read.",
+                MOVE};
     }
     if (!candidate.image && localPath(candidate.uri)) {
-        return {"Images are files of the server's machine.", MOVE};
+        return {"The server did not accept " + *localPath(candidate.uri) + ".",
+                "Images are files on the server's machine: check that the file is there, that the server can "
+                "read it, and that it is a complete firmware image."};
     }
     return {};
+}
+
+std::string getImageFor(const Adapter& adapter) {
+    return "Get the image made for " + (adapter.ids.empty() ? adapter.name : adapter.ids) + ".";
 }
 
 Explanation explainUnsupported(const Candidate& candidate) {
     const Adapter& adapter = candidate.adapter;
     if (!adapter.updatable) {
         return {"The firmware of " + adapter.name + " cannot be updated.",
-                "\"quenxctl adapters\" shows which adapters can."};
+                "\"quenxctl adapters\" shows which adapters can be updated."};
     }
     if (!candidate.comparison) return {};
     if (!candidate.comparison->isNetwork) {
-        return {candidate.image->path + " holds code for another kind of device than a network adapter.", ""};
+        return {candidate.image->path + " is for a device that is not a network adapter.",
+                getImageFor(adapter)};
     }
     if (candidate.comparison->foreignIds.empty()) return {};
-    return {"The image is for " + candidate.comparison->foreignIds + ", and " + adapter.name + " is " +
+    return {"The image is for " + candidate.comparison->foreignIds + ", but " + adapter.name + " is " +
                 adapter.ids + ".",
-            ""};
+            getImageFor(adapter)};
+}
+
+/// "IMG_PXE 1 is older than the installed 7, IMG_UEFI 0 than the installed 2."
+std::string olderText(const Candidate& candidate) {
+    std::string text;
+    for (const Component& component : candidate.comparison->chosen) {
+        const auto installed = versionOf(candidate.adapter.components, component.type);
+        if (!installed || component.version >= *installed) continue;
+        text += (text.empty() ? "" : ", ") + component.type + " " + std::to_string(component.version) +
+                (text.empty() ? " is older" : "") + " than the installed " + std::to_string(*installed);
+    }
+    return text.empty() ? "" : text + ".";
+}
+
+/// What the image has and the adapter lacks, or the other way round. Empty when the types are the same.
+std::string otherTypesText(const Candidate& candidate) {
+    const std::string& name = candidate.adapter.name;
+    for (const Component& component : candidate.comparison->chosen) {
+        if (!versionOf(candidate.adapter.components, component.type)) {
+            return "The image types differ: the image has " + component.type + ", but " + name + " has " +
+                   componentsText(candidate.adapter.components) + ".";
+        }
+    }
+    // A CLP entry point is part of the PXE image, so it goes with the old one.
+    constexpr const char* CLP = "IMG_CLP";
+    const bool losesClp = versionOf(candidate.adapter.components, CLP) &&
+                          versionOf(candidate.comparison->chosen, "IMG_PXE") &&
+                          !versionOf(candidate.comparison->chosen, CLP);
+    return losesClp ? "The image types differ: " + name + " has IMG_CLP, but the image does not." : "";
 }
 
 Explanation explainDowngrade(const Candidate& candidate) {
     // Without knowing what is installed there is nothing to compare with.
     if (!candidate.comparison || candidate.adapter.components.empty()) return {};
-    const std::string versions = "Installed on " + candidate.adapter.name + ": " +
-                                 componentsText(candidate.adapter.components) +
-                                 "; in the image: " + componentsText(candidate.comparison->chosen) + ".";
-    if (!candidate.comparison->sameTypes) {
-        return {versions + " The image types differ.",
-                "Use an image of the same types, choose among its types with --types, or use --force, which "
-                "works unless the configuration forbids downgrades."};
+    const std::string types = otherTypesText(candidate);
+    if (types.empty()) return {olderText(candidate), "Use a newer image, or install this one with --force."};
+    if (candidate.force) {
+        return {types,
+                "Use an image with the same types: --force does not help where the configuration "
+                "forbids downgrades."};
     }
-    return {versions, "Use a newer image, or --force to install the older one."};
+    return {types,
+            "Use an image with the same types, or --force, which works unless the configuration "
+            "forbids downgrades."};
 }
 
 Explanation explainNotApplicable(const Candidate& candidate) {
-    if (!candidate.comparison || candidate.comparison->missing.empty()) return {};
-    return {"The image holds no " + candidate.comparison->missing.front() + ".", ""};
+    if (!candidate.comparison) return {};
+    std::vector<std::string> types;
+    for (const utils::FirmwareVersionInfo& component : candidate.image->rom.components()) {
+        types.emplace_back(ma::firmwareTypeName(component.type));
+    }
+    if (types.empty()) {
+        return {candidate.image->path + " has nothing that can be installed.",
+                getImageFor(candidate.adapter)};
+    }
+    if (candidate.comparison->missing.empty()) return {};
+    return {"The image has no " + candidate.comparison->missing.front() + ".",
+            "It has " + listText(types) + "."};
 }
 
 Explanation find(const Management& management, std::uint32_t returnValue, const Candidate& candidate) {
@@ -92,26 +139,30 @@ Explanation find(const Management& management, std::uint32_t returnValue, const 
     }
 }
 
+/// Says that the old firmware is still there only when what was read back shows it.
+std::string readBackText(const Candidate& candidate, const std::vector<Component>& after) {
+    const std::vector<Component>& before = candidate.adapter.components;
+    if (after.empty() || before.empty()) return {};
+    if (after != before) return "It now has " + componentsText(after) + ".";
+    const bool isTelling = candidate.comparison && !candidate.comparison->current;
+    return isTelling ? "It keeps its old firmware." : "It reports the same versions as before.";
+}
+
 }  // namespace
 
 Explanation explainRefusal(Management& management, std::uint32_t returnValue, const Candidate& candidate) {
-    Explanation busy = explainBusyness(management, returnValue, candidate);
+    const Explanation busy = explainBusyness(management, returnValue, candidate);
     if (!busy.message.empty()) return busy;
-    const ReturnValueText& general = returnValueText(returnValue);
     const Explanation found = find(management, returnValue, candidate);
-    Explanation result;
-    result.message = std::string(general.meaning) + (found.message.empty() ? "" : " ") + found.message;
-    result.advice = found.advice.empty() ? general.advice : found.advice;
-    return result;
+    return found.message.empty() ? explainReturnValue(returnValue) : found;
 }
 
-Explanation explainFailedJob(const JobView& job, const std::string& adapter) {
+Explanation explainFailedJob(const JobView& job, const Candidate& candidate,
+                             const std::vector<Component>& after) {
     const std::string reason = job.errorDescription.empty() ? "no reason was given" : job.errorDescription;
-    Explanation result;
-    result.message = "The update of " + adapter + " failed: " + reason + " (error code " +
-                     std::to_string(job.errorCode) + ", job " + jobStateName(job.state) + ").";
-    result.advice = "The adapter keeps the firmware that it had; mend the cause and install again.";
-    return result;
+    return {"The update of " + candidate.adapter.name + " failed: " + reason + " (error " +
+                std::to_string(job.errorCode) + ").",
+            readBackText(candidate, after)};
 }
 
 }  // namespace cli

@@ -7,6 +7,16 @@
 
 namespace cli {
 
+/// What happened and what to do next, each one or two sentences.
+struct Explanation {
+    std::string message;
+    std::string advice;
+    ExitStatus status = ExitStatus::Failed;
+};
+
+/// Why a file could not be read: `error` is an errno. NotFound for one that is not there.
+Explanation cannotRead(const std::string& file, int error);
+
 /// The end of a verb that could not do its work: what happened, and what to do next.
 class Failure : public std::runtime_error {
   public:

@@ -6,7 +6,6 @@
 #include <cerrno>
 #include <fstream>
 #include <iterator>
-#include <system_error>
 
 namespace cli {
 
@@ -16,12 +15,18 @@ namespace {
 constexpr std::uint64_t LARGEST_READ = std::uint64_t{256} << 20;
 constexpr std::uint64_t LARGEST_IMAGE = 0x7FFFFFFF;
 
+Explanation notAnImage(const std::string& path, const std::string& why) {
+    return {path + " " + why + ".", "Name a complete firmware image."};
+}
+
+/// Empty for a file that can be an image.
 std::string kindProblem(const struct stat& info) {
     if (S_ISDIR(info.st_mode)) return "is a directory";
     if (!S_ISREG(info.st_mode)) return "is not a regular file";
     if (info.st_size == 0) return "is empty";
-    if (static_cast<std::uint64_t>(info.st_size) > LARGEST_IMAGE) return "is larger than 2 GiB";
-    return {};
+    const auto bytes = static_cast<std::uint64_t>(info.st_size);
+    if (bytes > LARGEST_IMAGE) return "is larger than 2 GiB";
+    return bytes > LARGEST_READ ? "is larger than any firmware image for a network adapter" : "";
 }
 
 bool readWhole(const std::string& path, std::vector<std::uint8_t>& content) {
@@ -29,10 +34,6 @@ bool readWhole(const std::string& path, std::vector<std::uint8_t>& content) {
     if (!file) return false;
     content.assign(std::istreambuf_iterator<char>(file), std::istreambuf_iterator<char>());
     return true;
-}
-
-std::string reasonOf(int error) {
-    return "cannot be read: " + std::generic_category().message(error);
 }
 
 std::string firstForeignIds(const ma::RomFile& rom, const std::string& adapterIds) {
@@ -70,22 +71,6 @@ std::uint64_t bytesOf(const ma::RomFile& rom, const std::vector<std::string>& ty
     return bytes;
 }
 
-void compareVersions(Comparison& result, const std::vector<Component>& installed) {
-    result.sameTypes = !result.chosen.empty();
-    result.current = !result.chosen.empty();
-    for (const Component& component : result.chosen) {
-        const auto there = std::find_if(installed.begin(), installed.end(),
-                                        [&](const Component& other) { return other.type == component.type; });
-        if (there == installed.end()) {
-            result.sameTypes = false;
-            result.current = false;
-            continue;
-        }
-        if (component.version < there->version) result.older = true;
-        if (component.version != there->version) result.current = false;
-    }
-}
-
 }  // namespace
 
 FirmwareImage readFirmwareImage(const std::string& path) {
@@ -93,24 +78,24 @@ FirmwareImage readFirmwareImage(const std::string& path) {
     image.path = path;
     struct stat info = {};
     if (stat(path.c_str(), &info) != 0) {
-        image.problem = reasonOf(errno);
+        image.problem = cannotRead(path, errno);
         return image;
     }
-    image.problem = kindProblem(info);
-    if (!image.isIntact()) return image;
+    if (const std::string why = kindProblem(info); !why.empty()) {
+        image.problem = notAnImage(path, why);
+        return image;
+    }
     image.bytes = static_cast<std::uint64_t>(info.st_size);
-    if (image.bytes > LARGEST_READ) {
-        image.problem = "is larger than any firmware image for a network adapter";
-        return image;
-    }
     std::vector<std::uint8_t> content;
     errno = 0;
     if (!readWhole(path, content)) {
-        image.problem = reasonOf(errno);
+        image.problem = cannotRead(path, errno);
         return image;
     }
     image.rom = ma::parseOptionRom(content);
-    if (image.rom.error) image.problem = "is no whole firmware image: " + *image.rom.error;
+    if (image.rom.error) {
+        image.problem = notAnImage(path, "is not a complete firmware image: " + *image.rom.error);
+    }
     return image;
 }
 
@@ -128,7 +113,10 @@ Comparison compareImage(const FirmwareImage& image, const Adapter& adapter,
     if (!adapter.ids.empty()) result.foreignIds = firstForeignIds(image.rom, adapter.ids);
     result.isNetwork = std::all_of(image.rom.images.begin(), image.rom.images.end(),
                                    [](const ma::RomImage& one) { return one.isNetwork(); });
-    compareVersions(result, adapter.components);
+    result.current = !result.chosen.empty() &&
+                     std::all_of(result.chosen.begin(), result.chosen.end(), [&](const Component& component) {
+                         return versionOf(adapter.components, component.type) == component.version;
+                     });
     return result;
 }
 

@@ -1,10 +1,12 @@
 #pragma once
 
 #include <cstdint>
+#include <optional>
 #include <string>
 #include <vector>
 
 #include "Cli/Adapters.h"
+#include "Cli/Failure.h"
 #include "MidAPI/Image/OptionRom.h"
 
 namespace cli {
@@ -12,16 +14,15 @@ namespace cli {
 /// An image file as the program itself reads it, to explain what the service answers.
 struct FirmwareImage {
     std::string path;
-    /// Why the file is no intact image, as a sentence without its subject ("is a directory"); empty when it
-    /// is one.
-    std::string problem;
+    /// Why the file is not an intact image; nothing when it is one.
+    std::optional<Explanation> problem;
     std::uint64_t bytes = 0;
     ma::RomFile rom;
 
-    bool isIntact() const { return problem.empty(); }
+    bool isIntact() const { return !problem; }
 };
 
-/// Reads the file. Never waits: what is no regular file is not opened. Never throws on account of the file.
+/// Reads the file. Never waits: only a regular file is opened. Never throws on account of the file.
 FirmwareImage readFirmwareImage(const std::string& path);
 
 /// What an intact image would mean for an adapter.
@@ -31,9 +32,7 @@ struct Comparison {
     std::vector<std::string> missing;  ///< types that are asked for and not in the file
     std::uint64_t bytes = 0;           ///< size of the chosen images
     std::string foreignIds;  ///< the first ids in the file that are not the adapter's; empty for none
-    bool isNetwork = true;   ///< false when an image is for no network adapter (a VGA ROM)
-    bool sameTypes = false;  ///< the adapter carries each chosen type
-    bool older = false;      ///< some chosen component is older than the installed one
+    bool isNetwork = true;   ///< false when an image is for something else (a VGA ROM)
     bool current = false;    ///< each chosen component is installed in the same version
 };
 

@@ -43,7 +43,7 @@ std::string adviceFor(CURLcode code) {
         case CURLE_PEER_FAILED_VERIFICATION:
             return "Name the server's certificate, or the one that signed it, with --cacert.";
         case CURLE_SSL_CACERT_BADFILE:
-            return "Name a file with certificates in PEM form, which you may read, with --cacert.";
+            return "Name a readable file with PEM certificates with --cacert.";
         case CURLE_COULDNT_CONNECT:
         case CURLE_COULDNT_RESOLVE_HOST:
         case CURLE_OPERATION_TIMEDOUT:
@@ -89,7 +89,7 @@ struct HttpClient::Handle {
 HttpClient::HttpClient(const ServerUrl& url, const ServerSettings& settings)
     : handle_(std::make_unique<Handle>()), url_(url.text()), namesCaFile_(!settings.caFile.empty()) {
     if (handle_->curl == nullptr) {
-        throw Failure(ExitStatus::Failed, "The HTTP library could not be started.",
+        throw Failure(ExitStatus::Failed, "Cannot start the HTTP library.",
                       "Free some memory and try again.");
     }
     handle_->set(CURLOPT_ERRORBUFFER, handle_->error);
@@ -129,7 +129,7 @@ HttpReply HttpClient::post(const std::vector<std::string>& headers, const std::s
     if (code != CURLE_OK) {
         const char* reason = handle_->error[0] == '\0' ? curl_easy_strerror(code) : handle_->error;
         const auto status = code == CURLE_SSL_CACERT_BADFILE ? ExitStatus::WrongUse : ExitStatus::Failed;
-        throw Failure(status, "No answer from " + url_ + ": " + reason + ".", adviceFor(code));
+        throw Failure(status, "The request to " + url_ + " failed: " + reason + ".", adviceFor(code));
     }
     curl_easy_getinfo(handle_->curl, CURLINFO_RESPONSE_CODE, &reply.status);
     return reply;

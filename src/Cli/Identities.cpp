@@ -13,9 +13,8 @@ namespace cli {
 namespace {
 
 constexpr const char* ASK_INVENTORY =
-    "\"quenxctl identities\" lists what there is. To offer a file, put its directory into the line "
-    "\"FWFilePath=\" of "
-    "the configuration file, or install it by its path.";
+    "\"quenxctl identities\" lists the images. To add a file, put its directory into the line "
+    "\"FWFilePath=\" of the service's configuration file, or install it by its path.";
 
 /// The same text, or two names of one file.
 bool isSameFile(const std::string& uri, const std::string& other) {
@@ -57,7 +56,8 @@ Identity findIdentity(Management& management, const std::string& id) {
         if (identity.id != id) continue;
         if (identity.isInstallable()) return identity;
         throw Failure(ExitStatus::NotFound,
-                      "\"" + id + "\" is installed on an adapter; there is no file of it.", ASK_INVENTORY);
+                      "\"" + id + "\" is installed on an adapter, but there is no image file of it.",
+                      ASK_INVENTORY);
     }
     throw Failure(ExitStatus::NotFound, "There is no software identity \"" + id + "\".", ASK_INVENTORY);
 }
@@ -69,7 +69,7 @@ Identity findIdentityOfFile(Management& management, const std::string& file) {
                                       [&](const std::string& uri) { return isSameFile(uri, wanted); });
         if (isIt) return identity;
     }
-    throw Failure(ExitStatus::NotFound, "The inventory does not offer " + file + ".", ASK_INVENTORY);
+    throw Failure(ExitStatus::NotFound, "The service's inventory does not have " + file + ".", ASK_INVENTORY);
 }
 
 }  // namespace cli

@@ -19,28 +19,48 @@ Json outcomeToJson(const InstallOutcome& outcome) {
     return json;
 }
 
-std::string versionText(const std::vector<Component>& components, const std::string& type) {
-    const auto version = versionOf(components, type);
-    return version ? std::to_string(*version) : "none";
+/// "1 -> 2", "1 (unchanged)"
+std::string changeText(std::optional<std::uint32_t> before, std::optional<std::uint32_t> after) {
+    const auto text = [](std::optional<std::uint32_t> version) {
+        return version ? std::to_string(*version) : std::string("none");
+    };
+    return before == after ? text(after) + " (unchanged)" : text(before) + " -> " + text(after);
 }
 
 void printChange(std::ostream& out, const InstallOutcome& outcome) {
     std::vector<std::vector<std::string>> rows;
     for (const Component& component : outcome.after) {
-        rows.push_back({"  " + component.type, versionText(outcome.before, component.type) + " -> " +
-                                                   std::to_string(component.version)});
+        rows.push_back({"  " + component.type,
+                        changeText(versionOf(outcome.before, component.type), component.version)});
+    }
+    for (const Component& component : outcome.before) {
+        if (outcome.after.empty() || versionOf(outcome.after, component.type)) continue;
+        rows.push_back({"  " + component.type, changeText(component.version, std::nullopt)});
     }
     printTable(out, rows);
 }
 
 }  // namespace
 
+InstallOutcome::InstallOutcome(const Candidate& candidate)
+    : adapter(candidate.adapter.name),
+      uri(candidate.uri),
+      before(candidate.adapter.components),
+      after(candidate.adapter.components) {}
+
+void InstallOutcome::end(const std::string& how, const Explanation& why) {
+    status = why.status;
+    result = how;
+    message = why.message;
+    advice = why.advice;
+}
+
 ExitStatus printOutcome(Context& context, const InstallOutcome& outcome) {
     if (context.json) {
         printJson(context.out, outcomeToJson(outcome));
         return outcome.status;
     }
-    const bool failed = outcome.status == ExitStatus::Failed;
+    const bool failed = outcome.status == ExitStatus::Failed || outcome.status == ExitStatus::NotFound;
     std::ostream& stream = failed ? context.error : context.out;
     stream << (failed ? "quenxctl: " : "") << printable(outcome.message) << '\n';
     if (outcome.job && !failed) printChange(stream, outcome);

@@ -5,15 +5,20 @@
 #include <string>
 #include <vector>
 
-#include "Cli/Adapters.h"
+#include "Cli/Candidate.h"
 #include "Cli/Context.h"
 #include "Cli/ExitStatus.h"
+#include "Cli/Failure.h"
 #include "Cli/Job.h"
 
 namespace cli {
 
 /// How an install, or a check of one, ended: the same facts for a person and for a script.
 struct InstallOutcome {
+    explicit InstallOutcome(const Candidate& candidate);
+    /// Sets what an update or a check ended with that did not go well.
+    void end(const std::string& how, const Explanation& why);
+
     ExitStatus status = ExitStatus::Failed;
     std::string
         result;  ///< one word or two: "updated", "installable", "already current", "refused", "failed"
@@ -24,7 +29,7 @@ struct InstallOutcome {
     std::optional<std::uint32_t> returnValue;  ///< of the method, when it was called
     std::optional<JobView> job;                ///< when one was started
     std::vector<Component> before;
-    std::vector<Component> after;
+    std::vector<Component> after;  ///< empty when that could not be read
 };
 
 /// Prints the outcome and returns its status.

@@ -10,6 +10,7 @@
 #include "Cli/ReturnValues.h"
 #include "Cli/ServiceCalls.h"
 #include "Cli/Verbs.h"
+#include "Framework/Model/CimError.h"
 
 namespace cli {
 
@@ -17,19 +18,6 @@ namespace {
 
 /// Calls the one method or the other.
 using Start = std::function<core::MethodResult()>;
-
-void requireKnownTypes(Management& management, const std::vector<std::string>& types) {
-    const std::vector<std::string> known = supportedTypes(management);
-    if (known.empty()) return;
-    for (const std::string& type : types) {
-        if (type.empty() || std::find(known.begin(), known.end(), type) != known.end()) continue;
-        std::string names;
-        for (const std::string& name : known)
-            names += (names.empty() ? "" : ", ") + name;
-        throw Failure(ExitStatus::WrongUse, "\"" + type + "\" is no image type.",
-                      "The service knows " + names + ", written just so.");
-    }
-}
 
 /// An update that says it completed and left the old versions has not.
 bool isInPlace(const Candidate& candidate, const std::vector<Component>& after) {
@@ -43,19 +31,32 @@ bool isInPlace(const Candidate& candidate, const std::vector<Component>& after) 
 void judgeJob(InstallOutcome& outcome, const Candidate& candidate) {
     const std::string& name = candidate.adapter.name;
     if (!outcome.job->hasSucceeded()) {
-        outcome.result = "failed";
-        const Explanation why = explainFailedJob(*outcome.job, name);
-        outcome.message = why.message;
-        outcome.advice = why.advice;
+        outcome.end("failed", explainFailedJob(*outcome.job, candidate, outcome.after));
     } else if (!isInPlace(candidate, outcome.after)) {
-        outcome.result = "failed";
-        outcome.message = "The update of " + name + " completed, yet the adapter has " +
-                          componentsText(outcome.after) + " and not what the image holds.";
-        outcome.advice = "Look into the system log, then install again with --force.";
+        outcome.end("failed", {"The update of " + name + " ended without an error, but " + name + " has " +
+                                   componentsText(outcome.after) + ", not what the image has.",
+                               "Look into the system log, then install again with --force."});
     } else {
         outcome.result = "updated";
         outcome.status = ExitStatus::Done;
-        outcome.message = name + " is updated.";
+        outcome.message = name + (candidate.comparison && candidate.comparison->current
+                                      ? " was rewritten with the same version."
+                                      : " was updated.");
+        if (outcome.after.empty() && !outcome.before.empty()) {
+            outcome.advice = "Its versions cannot be read now; \"quenxctl adapters\" shows them later.";
+        }
+    }
+}
+
+/// What the adapter carries after the update. Nothing where that cannot be read: the job's end is worth
+/// reporting all the same.
+std::vector<Component> readBack(Management& management, const Candidate& candidate) {
+    try {
+        return readComponents(management, candidate.adapter.path);
+    } catch (const Failure&) {
+        return {};
+    } catch (const core::CimError&) {
+        return {};
     }
 }
 
@@ -64,17 +65,13 @@ void followUpdate(Context& context, const core::CimPath& job, const Candidate& c
     context.observer.started(candidate.adapter.name, candidate.comparison ? candidate.comparison->bytes : 0);
     outcome.job = followJob(context.management, job, context.observer, context.following);
     outcome.job->adapter = candidate.adapter.name;
-    outcome.after = readComponents(context.management, candidate.adapter.path);
+    outcome.after = readBack(context.management, candidate);
     judgeJob(outcome, candidate);
 }
 
-ExitStatus runInstall(Context& context, const Candidate& candidate, bool force, const Start& start) {
-    InstallOutcome outcome;
-    outcome.adapter = candidate.adapter.name;
-    outcome.uri = candidate.uri;
-    outcome.before = candidate.adapter.components;
-    outcome.after = outcome.before;
-    if (!force && isAlreadyCurrent(candidate)) {
+ExitStatus runInstall(Context& context, const Candidate& candidate, const Start& start) {
+    InstallOutcome outcome(candidate);
+    if (!candidate.force && isAlreadyCurrent(candidate)) {
         outcome.status = ExitStatus::AlreadyCurrent;
         outcome.result = "already current";
         outcome.message = alreadyCurrentText(candidate);
@@ -89,10 +86,7 @@ ExitStatus runInstall(Context& context, const Candidate& candidate, bool force, 
     if (result.returnValue == RETURN_JOB_STARTED) {
         followUpdate(context, jobOf(result), candidate, outcome);
     } else {
-        outcome.result = "refused";
-        const Explanation why = explainRefusal(context.management, result.returnValue, candidate);
-        outcome.message = why.message;
-        outcome.advice = why.advice;
+        outcome.end("refused", explainRefusal(context.management, result.returnValue, candidate));
     }
     return printOutcome(context, outcome);
 }
@@ -100,8 +94,8 @@ ExitStatus runInstall(Context& context, const Candidate& candidate, bool force, 
 ExitStatus installImage(Context& context, const InstallOrder& order, Adapter adapter) {
     requireKnownTypes(context.management, order.types);
     const Candidate candidate = makeCandidate(std::move(adapter), imageUri(order.image), order.types,
-                                              context.management.sharesFiles());
-    return runInstall(context, candidate, order.force, [&] {
+                                              order.force, context.management.sharesFiles());
+    return runInstall(context, candidate, [&] {
         return installFromUri(context.management, candidate.uri, candidate.adapter.path,
                               {order.types, order.force});
     });
@@ -109,9 +103,9 @@ ExitStatus installImage(Context& context, const InstallOrder& order, Adapter ada
 
 ExitStatus installIdentity(Context& context, const InstallOrder& order, Adapter adapter) {
     const Identity identity = findIdentity(context.management, order.identity);
-    const Candidate candidate =
-        makeCandidate(std::move(adapter), identity.uri(), identity.types, context.management.sharesFiles());
-    return runInstall(context, candidate, order.force, [&] {
+    const Candidate candidate = makeCandidate(std::move(adapter), identity.uri(), identity.types, order.force,
+                                              context.management.sharesFiles());
+    return runInstall(context, candidate, [&] {
         return installFromIdentity(context.management, identity.path, candidate.adapter.path, order.force);
     });
 }

@@ -18,16 +18,17 @@ JobView lookAt(Management& management, const core::CimPath& job, const Following
             return readJob(management, job);
         } catch (const Failure& failure) {
             if (failures == MOST_FAILURES) {
-                throw Failure(failure.status(), failure.what(),
-                              "The update goes on all the same; \"quenxctl jobs\" shows how it ends, and "
-                              "after a restart of the server \"quenxctl adapters\" which version is there.");
+                throw Failure(
+                    failure.status(), failure.what(),
+                    "The update may still be running: \"quenxctl jobs\" shows it. If the server was "
+                    "restarted, \"quenxctl adapters\" shows which firmware is there.");
             }
         } catch (const core::CimError& error) {
             if (error.status() != core::CimStatus::NotFound) throw;
             throw Failure(ExitStatus::Failed,
-                          "The server does not know the job any more: it was deleted, or the server was "
-                          "started anew. The update runs to its end all the same.",
-                          "\"quenxctl adapters\" shows the version afterwards.");
+                          "The server no longer knows the job: it was deleted, or the server was restarted. "
+                          "How the update ends cannot be seen here.",
+                          "\"quenxctl adapters\" shows which firmware is there.");
         }
         following.pause();
     }

@@ -7,7 +7,9 @@
 #include <system_error>
 
 #include "Cli/Failure.h"
+#include "Framework/Classes/RequestScope.h"
 #include "MidAPI/ma.h"
+#include "Providers/UpdateInterfaces.h"
 
 namespace cli {
 
@@ -17,9 +19,8 @@ namespace {
 
 void requireReadable(const std::string& file, const std::string& what) {
     if (access(file.c_str(), R_OK) == 0) return;
-    const std::string reason = std::generic_category().message(errno);
-    throw Failure(ExitStatus::WrongUse, "Cannot read the " + what + " " + file + ": " + reason + ".",
-                  "Name a file that exists and that you may read.");
+    const Explanation why = cannotRead("the " + what + " " + file, errno);
+    throw Failure(ExitStatus::WrongUse, why.message, why.advice);
 }
 
 void selectAdapters(const LocalSettings& settings) {
@@ -48,7 +49,7 @@ void loadProviders(core::ProviderLibraries& providers, const std::string& direct
     if (!providers.problems().empty()) {
         const auto& problem = providers.problems().front();
         throw Failure(status, "Cannot load " + problem.file + ": " + problem.reason + ".",
-                      "All the libraries have to come from one build; " + advice);
+                      "All libraries must come from the same build. " + advice);
     }
     if (providers.loaded().empty()) {
         throw Failure(status, "There is no provider library in " + directory + ".", advice);
@@ -102,6 +103,16 @@ std::vector<core::CimPath> LocalManagement::associatorNames(const core::CimPath&
 core::MethodResult LocalManagement::invokeMethod(const core::CimPath& path, const std::string& method,
                                                  const std::vector<core::Argument>& arguments) {
     return requests_->invokeMethod(path, method, arguments);
+}
+
+std::optional<std::uint32_t> LocalManagement::checkImage(const core::CimPath& service, const std::string& uri,
+                                                         const core::CimPath& target,
+                                                         const InstallOptions& options) {
+    const core::RequestScope scope;
+    core::CimPath path = service;
+    auto* check = dynamic_cast<update::ImageCheck*>(core::GetCimBroker()->getInstanceByPath(path));
+    if (check == nullptr) return std::nullopt;
+    return check->checkImage(uri, target, options.codes, options.values);
 }
 
 void LocalManagement::deleteInstance(const core::CimPath& path) {

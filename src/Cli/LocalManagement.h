@@ -34,6 +34,9 @@ class LocalManagement : public Management {
                                                const core::AssociationFilter& by) override;
     core::MethodResult invokeMethod(const core::CimPath& path, const std::string& method,
                                     const std::vector<core::Argument>& arguments) override;
+    std::optional<std::uint32_t> checkImage(const core::CimPath& service, const std::string& uri,
+                                            const core::CimPath& target,
+                                            const InstallOptions& options) override;
     void deleteInstance(const core::CimPath& path) override;
     std::vector<core::ClassDeclaration> classes() override;
     bool runsJobs() const override { return true; }

@@ -45,7 +45,7 @@ void ProgressDisplay::showLine(std::chrono::steady_clock::time_point now) {
 
 void ProgressDisplay::interrupted() {
     printer_.print("The update of " + printable(progress_.adapter) +
-                   " cannot be stopped half-way: it goes on to its end, and this program waits for it.");
+                   " cannot be stopped halfway: it runs to its end, and this program waits for it.");
 }
 
 void ProgressDisplay::ended(const JobView&) {

@@ -71,14 +71,15 @@ void requireOk(const HttpReply& reply) {
                           "Give them with --user and the environment variable QUENXCTL_PASSWORD.");
         case 403:
             throw Failure(
-                ExitStatus::Failed, "The password is right, but this user may not use the server.",
-                "Log in as root, a member of quenx-admin, or one whom \"auth.readers\" of quenx-cimd "
-                "names.");
+                ExitStatus::Failed, "This user may not use the server.",
+                "On quenx-cimd, log in as root, as a member of the group quenx-admin, or as a user whom "
+                "its setting auth.readers names.");
         case 503:
-            throw Failure(ExitStatus::Failed,
-                          "The server is busy, or takes no log-ins from this address for a while because of "
-                          "wrong passwords.",
-                          "Try again in " + wait + ".");
+            throw Failure(
+                ExitStatus::Failed,
+                "The server is busy, or it blocks log-ins from this address for a while after wrong "
+                "passwords.",
+                "Try again in " + wait + ".");
         default:
             throw Failure(ExitStatus::Failed,
                           "The server answered with HTTP status " + std::to_string(reply.status) + why + ".",

@@ -1,7 +1,8 @@
 #pragma once
 
 #include <cstdint>
-#include <span>
+
+#include "Cli/Failure.h"
 
 namespace cli {
 
@@ -20,17 +21,7 @@ enum MethodReturn : std::uint32_t {
     RETURN_NO_COLLECTIONS = 4108,
 };
 
-/// What a return value means to a person.
-struct ReturnValueText {
-    std::uint32_t value;
-    const char* meaning;  ///< a sentence
-    const char* advice;   ///< a sentence that says what to do next; empty where there is nothing to do
-};
-
-/// All values that are known, ascending.
-std::span<const ReturnValueText> returnValueTexts();
-
-/// The texts for a value; for an unknown one a row that says so.
-const ReturnValueText& returnValueText(std::uint32_t value);
+/// What a return value means to a person, and what to do about it.
+Explanation explainReturnValue(std::uint32_t value);
 
 }  // namespace cli

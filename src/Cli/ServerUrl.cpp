@@ -45,7 +45,7 @@ ServerUrl::ServerUrl(const std::string& text) {
     if (text.find("://") == std::string::npos) refuse(text, "does not begin with https:// or http://");
     const Url url(curl_url(), curl_url_cleanup);
     const CURLUcode error = curl_url_set(url.get(), CURLUPART_URL, text.c_str(), CURLU_NON_SUPPORT_SCHEME);
-    if (error != CURLUE_OK) refuse(text, std::string("is no URL: ") + curl_url_strerror(error));
+    if (error != CURLUE_OK) refuse(text, std::string("is not a URL: ") + curl_url_strerror(error));
     const std::string scheme = partOf(url, CURLUPART_SCHEME);
     if (scheme != "https" && scheme != "http") refuse(text, "does not begin with https:// or http://");
     if (!partOf(url, CURLUPART_USER).empty() || !partOf(url, CURLUPART_PASSWORD).empty()) {

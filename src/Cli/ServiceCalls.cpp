@@ -4,15 +4,16 @@
 #include <cstdint>
 
 #include "Cli/Failure.h"
+#include "Cli/Suggestion.h"
 #include "Cli/Values.h"
 
 namespace cli {
 
 namespace {
 
-constexpr std::uint64_t OPTION_FORCE = 3;
-constexpr std::uint64_t OPTION_UPDATE = 5;
-constexpr std::uint64_t OPTION_TARGET_TYPES = 32768;
+constexpr std::uint16_t OPTION_FORCE = 3;
+constexpr std::uint16_t OPTION_UPDATE = 5;
+constexpr std::uint16_t OPTION_TARGET_TYPES = 32768;
 
 core::Argument textArgument(const std::string& name, const std::string& text) {
     return {name, core::CimValue::of(core::CimType::String, text)};
@@ -24,20 +25,39 @@ core::Argument referenceArgument(const std::string& name, const core::CimPath& p
 
 /// The values are parallel to the options, value i belonging to option i: the one option that has a value
 /// comes first.
-void addOptions(std::vector<core::Argument>& arguments, const InstallChoice& choice) {
-    std::vector<core::CimScalar> options;
-    core::CimValue values = core::CimValue::null(core::CimType::String, true);
+InstallOptions optionsOf(const InstallChoice& choice) {
+    InstallOptions options;
     if (!choice.types.empty()) {
         std::string joined;
         for (const std::string& type : choice.types)
             joined += (&type == &choice.types.front() ? "" : "+") + type;
-        options.emplace_back(OPTION_TARGET_TYPES);
-        values = core::CimValue::arrayOf(core::CimType::String, {joined});
+        options.codes.push_back(OPTION_TARGET_TYPES);
+        options.values.push_back(std::move(joined));
     }
-    options.emplace_back(OPTION_UPDATE);
-    if (choice.force) options.emplace_back(OPTION_FORCE);
-    arguments.push_back({"InstallOptions", core::CimValue::arrayOf(core::CimType::Uint16, options)});
+    options.codes.push_back(OPTION_UPDATE);
+    if (choice.force) options.codes.push_back(OPTION_FORCE);
+    return options;
+}
+
+void addOptions(std::vector<core::Argument>& arguments, const InstallChoice& choice) {
+    const InstallOptions options = optionsOf(choice);
+    std::vector<core::CimScalar> codes;
+    for (const std::uint64_t code : options.codes)
+        codes.emplace_back(code);
+    core::CimValue values = core::CimValue::null(core::CimType::String, true);
+    if (!options.values.empty()) {
+        values =
+            core::CimValue::arrayOf(core::CimType::String, {options.values.begin(), options.values.end()});
+    }
+    arguments.push_back({"InstallOptions", core::CimValue::arrayOf(core::CimType::Uint16, codes)});
     arguments.push_back({"InstallOptionsValues", std::move(values)});
+}
+
+/// The names of image types that the service knows, from its capabilities; none when it does not say.
+std::vector<std::string> supportedTypes(Management& management) {
+    const auto instances = management.enumerateInstances("Quenx_SoftwareInstallationServiceCapabilities");
+    if (instances.empty()) return {};
+    return textsOf(instances.front(), "SupportedTargetTypes");
 }
 
 core::MethodResult call(Management& management, const std::string& method,
@@ -77,6 +97,11 @@ core::MethodResult checkIdentity(Management& management, const core::CimPath& id
                 {referenceArgument("Source", identity), referenceArgument("Target", target)});
 }
 
+std::optional<std::uint32_t> checkUri(Management& management, const std::string& uri,
+                                      const core::CimPath& target, const InstallChoice& choice) {
+    return management.checkImage(findService(management), uri, target, optionsOf(choice));
+}
+
 core::CimPath jobOf(const core::MethodResult& result) {
     for (const core::Argument& output : result.outputs) {
         const core::CimScalar* value = output.value.scalar();
@@ -85,14 +110,18 @@ core::CimPath jobOf(const core::MethodResult& result) {
             return std::get<core::CimPath>(*value);
         }
     }
-    throw Failure(ExitStatus::Failed, "The service started an update and did not say which job it is.",
-                  "Look at the jobs with \"quenxctl instances Quenx_ConcreteJob\".");
+    throw Failure(ExitStatus::Failed, "The service started an update but did not name its job.",
+                  "\"quenxctl jobs\" lists the jobs of a server.");
 }
 
-std::vector<std::string> supportedTypes(Management& management) {
-    const auto instances = management.enumerateInstances("Quenx_SoftwareInstallationServiceCapabilities");
-    if (instances.empty()) return {};
-    return textsOf(instances.front(), "SupportedTargetTypes");
+void requireKnownTypes(Management& management, const std::vector<std::string>& types) {
+    const std::vector<std::string> known = supportedTypes(management);
+    if (known.empty()) return;
+    for (const std::string& type : types) {
+        if (type.empty() || std::find(known.begin(), known.end(), type) != known.end()) continue;
+        throw Failure(ExitStatus::WrongUse, "There is no image type \"" + type + "\".",
+                      didYouMean(type, known) + "The types are " + listText(known) + ".");
+    }
 }
 
 }  // namespace cli

@@ -1,5 +1,7 @@
 #pragma once
 
+#include <cstdint>
+#include <optional>
 #include <string>
 #include <vector>
 
@@ -22,6 +24,10 @@ core::MethodResult installFromUri(Management& management, const std::string& uri
 /// Calls InstallFromSoftwareIdentity; the identity itself says the types.
 core::MethodResult installFromIdentity(Management& management, const core::CimPath& identity,
                                        const core::CimPath& target, bool force);
+/// Verifies as InstallFromURI does, without installing. Nothing on a server, whose service has no such
+/// method.
+std::optional<std::uint32_t> checkUri(Management& management, const std::string& uri,
+                                      const core::CimPath& target, const InstallChoice& choice);
 /// Calls CheckSoftwareIdentity.
 core::MethodResult checkIdentity(Management& management, const core::CimPath& identity,
                                  const core::CimPath& target);
@@ -29,7 +35,7 @@ core::MethodResult checkIdentity(Management& management, const core::CimPath& id
 /// The job among a method's outputs. Throws Failure when there is none.
 core::CimPath jobOf(const core::MethodResult& result);
 
-/// The names of image types that the service knows, from its capabilities; none when it does not say.
-std::vector<std::string> supportedTypes(Management& management);
+/// Throws Failure for an image type that the service does not know. Any will do where it does not say.
+void requireKnownTypes(Management& management, const std::vector<std::string>& types);
 
 }  // namespace cli

@@ -23,8 +23,10 @@ ExitStatus install(Context& context, const InstallOrder& order);
 
 struct CheckOrder {
     std::string target;
-    std::string file;      ///< a file that the inventory offers; empty with an identity
-    std::string identity;  ///< empty with a file
+    std::string file;  ///< a path or a URI; on a server one that the inventory offers. Empty with an identity
+    std::string identity;            ///< empty with a file
+    std::vector<std::string> types;  ///< with a file, and not on a server
+    bool force = false;              ///< likewise
 };
 ExitStatus check(Context& context, const CheckOrder& order);
 

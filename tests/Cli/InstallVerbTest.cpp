@@ -6,6 +6,7 @@
 
 #include "Cli/Failure.h"
 #include "Cli/Verbs.h"
+#include "Framework/Model/CimError.h"
 #include "Support/TempFolder.h"
 #include "Support/TestRoms.h"
 
@@ -44,6 +45,7 @@ class FakeManagement : public cli::Management {
     std::deque<InstanceValue> jobs = {job(3, 0), job(4, 40), job(7, 100)};  ///< one a look
     unsigned unanswered = 0;                                                ///< so many looks get no answer
     bool isCalled = false;
+    bool isReadable = true;  ///< what is installed, after the job
 
     std::vector<InstanceValue> enumerateInstances(const std::string& className) override {
         if (className != "Quenx_EthernetPort") return {};
@@ -66,6 +68,7 @@ class FakeManagement : public cli::Management {
         return view;
     }
     std::vector<InstanceValue> associators(const CimPath&, const core::AssociationFilter&) override {
+        if (jobs.empty() && !isReadable) throw core::CimError(core::CimStatus::Failed, "gone");
         return installed;
     }
     std::vector<CimPath> associatorNames(const CimPath&, const core::AssociationFilter&) override {
@@ -112,7 +115,7 @@ TEST_F(InstallVerb, FollowsTheJobOverABrokenConnection) {
     model_.unanswered = 10;
     EXPECT_EQ(install(), ExitStatus::Done);
     EXPECT_EQ(observer_.events, "eth0, 0, 40, 100, end 7");
-    EXPECT_EQ(out_.str(), "eth0 is updated.\n  IMG_PXE   1 -> 2\n  IMG_UEFI  0 -> 1\n");
+    EXPECT_EQ(out_.str(), "eth0 was updated.\n  IMG_PXE   1 -> 2\n  IMG_UEFI  0 -> 1\n");
     EXPECT_EQ(error_.str(), "");
 }
 
@@ -122,14 +125,15 @@ TEST_F(InstallVerb, DoesNotWaitForEverForAnAnswer) {
         install();
         ADD_FAILURE() << "waits for ever";
     } catch (const cli::Failure& failure) {
-        EXPECT_TRUE(failure.advice().starts_with("The update goes on all the same; \"quenxctl jobs\" shows"));
+        EXPECT_TRUE(failure.advice().starts_with("The update may still be running: \"quenxctl jobs\" shows"));
     }
 }
 
 TEST_F(InstallVerb, CompletedWithTheOldVersionsIsNoSuccess) {
     model_.installedAfterJob = model_.installed;
     EXPECT_EQ(install(), ExitStatus::Failed);
-    EXPECT_NE(error_.str().find("completed, yet the adapter has IMG_PXE 1, IMG_UEFI 0"), std::string::npos);
+    EXPECT_NE(error_.str().find("eth0 ended without an error, but eth0 has IMG_PXE 1, IMG_UEFI 0"),
+              std::string::npos);
 }
 
 TEST_F(InstallVerb, InterruptedBeforeTheStartChangesNothing) {
@@ -142,6 +146,34 @@ TEST_F(InstallVerb, OneHundredPercentIsNoSuccess) {
     model_.jobs = {job(4, 100), job(10, 100)};
     EXPECT_EQ(install(), ExitStatus::Failed);
     EXPECT_EQ(observer_.events, "eth0, 99, end 10");
+}
+
+TEST_F(InstallVerb, AfterAFailureOnlySaysWhatWasReadBack) {
+    const struct {
+        std::vector<InstanceValue> installed;
+        bool isReadable;
+        std::string advice;
+    } rows[] = {
+        {{component("IMG_PXE", 1), component("IMG_UEFI", 0)}, true, "It keeps its old firmware.\n"},
+        {{component("IMG_PXE", 2), component("IMG_UEFI", 0)}, true, "It now has IMG_PXE 2, IMG_UEFI 0.\n"},
+        {{component("IMG_PXE", 1), component("IMG_UEFI", 0)}, false, ""},
+    };
+    for (const auto& row : rows) {
+        model_.jobs = {job(10, 100)};
+        model_.installed = {component("IMG_PXE", 1), component("IMG_UEFI", 0)};
+        model_.installedAfterJob = row.installed;
+        model_.isReadable = row.isReadable;
+        error_.str("");
+        EXPECT_EQ(install(), ExitStatus::Failed);
+        EXPECT_EQ(error_.str(),
+                  "quenxctl: The update of eth0 failed: no reason was given (error 0).\n" + row.advice);
+    }
+    // A success stays one.
+    model_.jobs = {job(7, 100)};
+    EXPECT_EQ(install(), ExitStatus::Done);
+    EXPECT_EQ(
+        out_.str(),
+        "eth0 was updated.\nIts versions cannot be read now; \"quenxctl adapters\" shows them later.\n");
 }
 
 }  // namespace

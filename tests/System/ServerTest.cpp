@@ -34,7 +34,7 @@ class Server : public ::testing::Test {
 TEST_F(Server, UpdatesAndKeepsTheJob) {
     const ProgramResult result = quenxctl({"install", "--target", "eth0", image_});
     EXPECT_EQ(result.status, 0) << result.error;
-    EXPECT_TRUE(contains(result.out, "eth0 is updated.\n  IMG_PXE   1 -> 2\n")) << result.out;
+    EXPECT_TRUE(contains(result.out, "eth0 was updated.\n  IMG_PXE   1 -> 2\n")) << result.out;
     EXPECT_EQ(quenxctl({"install", "--target", "eth0", image_}).status, 3);
     const ProgramResult refused = quenxctl({"install", "--target", "eth3", image_});
     EXPECT_EQ(refused.status, 1);
@@ -48,6 +48,11 @@ TEST_F(Server, UpdatesAndKeepsTheJob) {
     const std::string day = jobs[0].value("startTime", "none").substr(0, 4);
     const std::string table = quenxctl({"jobs"}).out;
     EXPECT_TRUE(contains(table, "Job#1  eth0     Completed  100      " + day + "-")) << table;
+    // A server checks by identity only.
+    const ProgramResult check = quenxctl({"check", "--target", "eth0", image_});
+    EXPECT_EQ(check.status, 4);
+    EXPECT_TRUE(contains(check.error, "The service's inventory does not have " + image_)) << check.error;
+    EXPECT_EQ(quenxctl({"check", "--target", "eth0", image_, "--force"}).status, 2);
     EXPECT_EQ(quenxctl({"delete", "0"}).status, 4);
     EXPECT_EQ(quenxctl({"delete", "1"}).status, 0);
     EXPECT_EQ(quenxctl({"delete", jobs[0]["id"]}).status, 4);
@@ -65,13 +70,14 @@ TEST_F(Server, SaysWhoHoldsTheAdapters) {
         const std::string error = quenxctl({"install", "--target", adapter, image_}).error;
         EXPECT_TRUE(contains(error, part)) << error;
     };
-    expectRefusal("eth0", "eth0 is being updated: Quenx:FirmwareUpdate@Job#1, ");
-    expectRefusal("eth1", "eth0 is being updated: Quenx:FirmwareUpdate@Job#1, ");
+    expectRefusal("eth0", "eth0 is being updated (Quenx:FirmwareUpdate@Job#1, ");
+    expectRefusal("eth1", "eth0 is being updated (Quenx:FirmwareUpdate@Job#1, ");
     const std::string deleted = quenxctl({"delete", "Quenx:FirmwareUpdate@Job#1"}).out;
     EXPECT_TRUE(contains(deleted, "Its update continues, but can no longer be followed")) << deleted;
     EXPECT_TRUE(contains(first.finish().error, "it was deleted"));
-    expectRefusal("eth0", "No job is running, yet the server holds eth0 for an earlier check, or ");
-    expectRefusal("eth1", "or it holds another adapter than eth1 for an earlier check, or ");
+    expectRefusal("eth0",
+                  "The server refuses eth0, although no job is running: an earlier check may hold it, or ");
+    expectRefusal("eth1", "or another adapter than eth1 is in use: an earlier check may hold it, or ");
 }
 
 /// The lines in an order that says nothing.
@@ -120,7 +126,7 @@ TEST_F(Server, RefusesWhomItCannotTrust) {
     // No other host than this one, and nobody who would answer.
     const ProgramResult clear = test::run(
         {QUENXCTL, "--server", "http://0.0.0.0:1", "--user", "a", "adapters"}, {"QUENXCTL_PASSWORD=a"});
-    EXPECT_TRUE(contains(clear.error, "WARNING: http://: the password and all else is sent in clear."))
+    EXPECT_TRUE(contains(clear.error, "WARNING: http:// sends the password and everything else unencrypted."))
         << clear.error;
 }
 

@@ -26,7 +26,7 @@ TEST_F(Update, WritesTheImageAndSaysWhatChanged) {
     EXPECT_EQ(firmwareOf("eth0"), OLD);
     const ProgramResult result = test::run(install());
     EXPECT_EQ(result.status, 0) << result.error;
-    EXPECT_TRUE(result.out.ends_with("eth0 is updated.\n  IMG_PXE   1 -> 2\n  IMG_UEFI  0 -> 2\n"))
+    EXPECT_TRUE(result.out.ends_with("eth0 was updated.\n  IMG_PXE   1 -> 2\n  IMG_UEFI  0 -> 2\n"))
         << result.out;
     EXPECT_EQ(result.error, "");
     const std::string table = quenxctl({"adapters"}).out;
@@ -38,11 +38,17 @@ TEST_F(Update, WritesTheImageAndSaysWhatChanged) {
                           "eth3  05:00.0  1022:2000  no         IMG_PXE 1                \n"))
         << table;
 
-    const ProgramResult again = test::run(install("0000:03:00.0"));
-    EXPECT_EQ(again.status, 3);
-    EXPECT_EQ(again.out,
-              "eth0 is already current: it has IMG_PXE 2, IMG_UEFI 2, as the image does.\n"
-              "Use --force to write it again.\n");
+    for (const char* address : {"03:00.0", "0000:03:00.0"}) {
+        const ProgramResult again = test::run(install(address));
+        EXPECT_EQ(again.status, 3);
+        EXPECT_EQ(again.out,
+                  "eth0 is already current: it has IMG_PXE 2, IMG_UEFI 2.\nUse --force to write it again.\n");
+    }
+    const ProgramResult forced = quenxctl({"update", "--target", "eth0", image_, "--force"});
+    EXPECT_TRUE(
+        forced.out.ends_with("eth0 was rewritten with the same version.\n"
+                             "  IMG_PXE   2 (unchanged)\n  IMG_UEFI  2 (unchanged)\n"))
+        << forced.out;
 }
 
 TEST_F(Update, OneTypeCanBeCurrentAndTheOtherNot) {
@@ -61,8 +67,8 @@ TEST_F(Update, AFailureOnTheAdapterIsSaidInItsWords) {
     const ProgramResult result = test::run(install());
     EXPECT_EQ(result.status, 1);
     EXPECT_EQ(result.error,
-              "quenxctl: The update of eth0 failed: erase failed\\x1b[2J (error code 6, job Exception).\n"
-              "The adapter keeps the firmware that it had; mend the cause and install again.\n");
+              "quenxctl: The update of eth0 failed: erase failed\\x1b[2J (error 6).\n"
+              "It keeps its old firmware.\n");
     EXPECT_EQ(firmwareOf("eth0"), OLD);
 }
 
@@ -94,7 +100,7 @@ TEST_F(Update, CtrlCWaitsForTheEnd) {
     Program program(install(), Program::Output::Terminal, {"TERM=xterm", "NO_COLOR"});
     ASSERT_TRUE(program.waitFor("eth0  ["));
     program.type("\x03");
-    EXPECT_TRUE(program.waitFor("it goes on to its end, and this program waits for it."));
+    EXPECT_TRUE(program.waitFor("it runs to its end, and this program waits for it."));
     flash.release();
     EXPECT_EQ(program.finish().status, 0);
     EXPECT_EQ(firmwareOf("eth0"), NEW);

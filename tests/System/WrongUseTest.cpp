@@ -11,9 +11,10 @@ using test::ProgramResult;
 
 class WrongUse : public test::Quenxctl {
   protected:
-    /// Installing this on eth0 is refused for this reason.
-    void expectRefusal(const std::string& image, const std::string& part) const {
-        expectError({"install", "--target", "eth0", image}, 1, part);
+    /// Installing this on eth0 is refused for this reason, and so is a check.
+    void expectRefusal(const std::string& image, const std::string& part, int status = 1) const {
+        expectError({"install", "--target", "eth0", image}, status, part);
+        expectError({"check", "--target", "eth0", image}, status, part);
     }
 };
 
@@ -25,17 +26,21 @@ TEST_F(WrongUse, BadFilesAreRefusedWithTheReason) {
     std::vector<std::uint8_t> cut = test::realRom("efi-virtio");
     cut.resize(100'000);
 
-    expectRefusal(folder_ / "none", "none cannot be read: No such file or directory.");
-    expectRefusal(folder_.path(), "is a directory.");
+    constexpr int NOT_FOUND = 4;
+    expectRefusal(
+        folder_ / "none",
+        "quenxctl: Cannot read " + (folder_ / "none") + ": No such file or directory.\nCheck the path.\n",
+        NOT_FOUND);
+    expectRefusal("%n%s\n.rom", "%n%s\\x0a.rom: No such file or directory.", NOT_FOUND);
+    expectRefusal(folder_.path(), "is a directory.\nName a complete firmware image.");
     expectRefusal(fifo, "is not a regular file.");
     expectRefusal("/dev/zero", "is not a regular file.");
     expectRefusal(huge, "is larger than 2 GiB.");
     expectRefusal(folder_.write("empty", ""), "is empty.");
-    expectRefusal(folder_.write("text", "hello"), "is no whole firmware image: ");
-    expectRefusal(folder_.write("cut", cut), "is no whole firmware image: ");
-    expectRefusal("http://host/x.rom", "does not read images by \"http:\".");
-    expectRefusal("file:/x", "is no well-formed file URI.\nWrite it as file:///directory/file");
-    expectRefusal("%n%s\n.rom", "%n%s\\x0a.rom cannot be read: No such file or directory.");
+    expectRefusal(folder_.write("text", "hello"), "is not a complete firmware image: ");
+    expectRefusal(folder_.write("cut", cut), "is not a complete firmware image: ");
+    expectRefusal("http://host/x.rom", "does not read images over \"http:\".");
+    expectRefusal("file:/x", "file:/x is not a valid file URI.\nWrite it as file:///directory/file");
     EXPECT_EQ(firmwareOf("eth0"), "IMG_PXE 1, IMG_UEFI 0");
 }
 
@@ -44,33 +49,43 @@ TEST_F(WrongUse, WrongImagesAreRefusedWithBothSides) {
     // Of the same versions as what is installed, too.
     const auto foreign = test::madeRom({{FirmwareType::PXE, 1}, {FirmwareType::UEFI, 0}}, 0x10ec, 0x8139);
     expectRefusal(folder_.write("foreign.rom", foreign),
-                  "The image is for 10ec:8139, and eth0 is 1af4:1041.\nGet the image for this adapter's ids");
+                  "The image is for 10ec:8139, but eth0 is 1af4:1041.\nGet the image made for 1af4:1041.");
     ma::NewRomImage vga;
     vga.type = FirmwareType::PXE;
     vga.vendorId = 0x1af4;
     vga.deviceId = 0x1041;
     vga.classCode = 0x030000;
     expectRefusal(folder_.write("vga.rom", ma::makeRomImage(vga)),
-                  "holds code for another kind of device than a network adapter.");
-    const auto pxe = test::madeRom({{FirmwareType::PXE, 2}}, 0x15ad, 0x07b0);
-    expectError({"install", "--target", "eth4", folder_.write("pxe.rom", pxe)}, 1, "The image types differ.");
+                  "is for a device that is not a network adapter.");
+    const std::string pxe = folder_.write("pxe.rom", test::madeRom({{FirmwareType::PXE, 2}}, 0x15ad, 0x07b0));
+    std::vector<std::string> differing = {"check", "--target", "eth4", pxe};
+    const std::string types =
+        "The image types differ: the image has IMG_PXE, but eth4 has IMG_iSCSI 1, IMG_UEFI 0.\n";
+    expectError(differing, 1, types + "Use an image with the same types, or --force, which works unless");
+    differing.emplace_back("--force");
+    EXPECT_EQ(quenxctl(differing).status, 0);
+    differing.insert(differing.end(), {"--config", folder_.write("provider.conf", "OEMCustomizeable=5\n")});
+    expectError(differing, 1, types + "Use an image with the same types: --force does not help");
 
     ASSERT_EQ(quenxctl({"install", "--target", "eth0", image_}).status, 0);
     const std::string older = test::realRomPath("efi-virtio");
     expectRefusal(older,
-                  "Installed on eth0: IMG_PXE 2, IMG_UEFI 2; in the image: IMG_PXE 1, IMG_UEFI 0.\nUse a "
-                  "newer image, or --force");
+                  "quenxctl: IMG_PXE 1 is older than the installed 2, IMG_UEFI 0 than the installed 2.\n"
+                  "Use a newer image, or install this one with --force.\n");
     EXPECT_EQ(quenxctl({"install", "--target", "eth0", older, "--force"}).status, 0);
     EXPECT_EQ(firmwareOf("eth0"), "IMG_PXE 1, IMG_UEFI 0");
 }
 
 TEST_F(WrongUse, OtherAdaptersAndNames) {
+    const std::string fixed =
+        folder_.write("fixed.rom", test::madeRom({{utils::FirmwareType::PXE, 2}}, 0x1022, 0x2000));
     const struct {
         std::vector<std::string> arguments;
         int status;
         std::string part;
     } rows[] = {
-        {{"install", "--target", "eth3", image_}, 1, "The firmware of eth3 cannot be updated."},
+        // The ids match.
+        {{"install", "--target", "eth3", fixed}, 1, "quenxctl: The firmware of eth3 cannot be updated.\n"},
         {{"install", "--target", "eth7", image_},
          4,
          "\"eth7\".\nThe adapters are eth0, eth1, eth2, eth3, eth4."},
@@ -78,9 +93,13 @@ TEST_F(WrongUse, OtherAdaptersAndNames) {
         {{"install", "--target", "0001:03:00.0", image_}, 4, "There is no adapter \"0001:03:00.0\"."},
         {{"install", "--target", "X.A=\"\\\"\\\\", image_}, 4, "There is no adapter \"X.A="},
         {{"install", "--target", "X.A=", image_}, 4, "There is no adapter \"X.A=\"."},
-        {{"install", "--target", "eth0", image_, "--types", "IMG_FCoE"}, 1, "The image holds no IMG_FCoE."},
-        {{"install", "--target", "eth0", image_, "--types", "img_pxe"}, 2, "\"img_pxe\" is no image type."},
-        {{"install", "--target", "eth0", image_, "--types", "IMG_X"}, 2, "IMG_FCoE, written just so."},
+        {{"install", "--target", "eth0", image_, "--types", "IMG_FCoE"},
+         1,
+         "The image has no IMG_FCoE.\nIt has IMG_PXE, IMG_UEFI.\n"},
+        {{"install", "--target", "eth0", image_, "--types", "img_pxe"},
+         2,
+         "Did you mean IMG_PXE? The types are"},
+        {{"check", "--target", "eth0", image_, "--types", "IMG_X"}, 2, "There is no image type \"IMG_X\"."},
         {{"install", "--target", "eth0"}, 2, "name one image"},
         {{"install", "--target", "eth0", image_, "--identity", "x"}, 2, "name one image"},
         {{"install", image_}, 2, "--target is required"},
@@ -92,8 +111,8 @@ TEST_F(WrongUse, OtherAdaptersAndNames) {
         {{"adapters", "--server", ""}, 2, "--server \"\" does not begin with https:// or http://."},
         {{"adapters", "--server", "127.0.0.1:5989"}, 2, "Write it as https://host:5989."},
         {{"adapters", "--server", "https://a:b@host"}, 2, "Name the user with --user"},
-        {{"associators", "nonsense"}, 2, "is no path of an instance."},
-        {{"adapters", "--config", folder_ / "none"}, 2, "Cannot read the configuration file"},
+        {{"associators", "nonsense"}, 2, "is not the path of an instance."},
+        {{"adapters", "--config", folder_ / "none"}, 2, ": No such file or directory.\nCheck the path.\n"},
         {{"adapters", "--providers", folder_ / "none"}, 2, "Cannot read the provider directory"},
         {{"adapters", "--providers", folder_.path()}, 2, "There is no provider library in "},
     };
@@ -120,6 +139,8 @@ TEST_F(WrongUse, JsonIsOneDocumentAlsoForErrors) {
         {{"instances", "No_Such"}, 4, "/exitStatus", 4},
         {{"frobnicate"}, 2, "/error", "There is no verb \"frobnicate\"."},
         {{"install", "--target", "eth9", image_}, 4, "/error", "There is no adapter \"eth9\"."},
+        {{"check", "--target", "eth0", "none.rom"}, 4, "/result", "refused"},
+        {{"check", "--target", "eth0", image_}, 0, "/result", "installable"},
         {{"install", "--target", "eth3", image_}, 1, "/returnValue", 4097},
         {{"install", "--target", "eth0", image_}, 0, "/job/state", 7},
         {{"install", "--target", "eth0", image_}, 3, "/result", "already current"},
