@@ -3,6 +3,7 @@
 #include <malloc.h>
 
 #include "ColdCaches.h"
+#include "Framework/Classes/CimBroker.h"
 #include "Framework/Requests/CimRequests.h"
 #include "InstantAdapters.h"
 #include "Providers/SoftwareUpdate/Quenx_ConcreteJobClass.h"

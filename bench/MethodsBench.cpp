@@ -21,10 +21,8 @@ class Host {
     Host(const Host&) = delete;
     Host& operator=(const Host&) = delete;
 
-    core::CimPath first(const char* className) const {
-        return m_requests.enumerateInstanceNames(className).at(0);
-    }
-    CimValue firstReference(const char* className) const {
+    core::CimPath first(const char* className) { return m_requests.enumerateInstanceNames(className).at(0); }
+    CimValue firstReference(const char* className) {
         return CimValue::of(CimType::Reference, CimScalar(first(className)));
     }
     core::CimRequests& requests() { return m_requests; }
@@ -39,7 +37,7 @@ class Host {
 
 /// Calls the method again and again. The jobs that come of it are deleted, and claims freed, outside the
 /// time.
-void call(benchmark::State& state, const Host& host, const char* method,
+void call(benchmark::State& state, Host& host, const char* method,
           const std::vector<core::Argument>& arguments, unsigned expected) {
     const core::CimPath service = host.first("Quenx_SoftwareInstallationService");
     for (auto _ : state) {
@@ -57,7 +55,7 @@ void call(benchmark::State& state, const Host& host, const char* method,
 }
 
 void installFromUri(benchmark::State& state, const std::string& uri, unsigned expected) {
-    const Host host;
+    Host host;
     call(state, host, "InstallFromURI",
          {{"URI", CimValue::of(CimType::String, CimScalar(uri.empty() ? host.imageUri() : uri))},
           {"Target", host.firstReference("Quenx_EthernetPort")},
@@ -73,7 +71,7 @@ void installRefused(benchmark::State& state) {
 }
 
 void installFromIdentity(benchmark::State& state) {
-    const Host host;
+    Host host;
     call(state, host, "InstallFromSoftwareIdentity",
          {{"Source", host.firstReference("Quenx_SoftwareIdentity")},
           {"Target", host.firstReference("Quenx_EthernetPort")},
@@ -82,7 +80,7 @@ void installFromIdentity(benchmark::State& state) {
 }
 
 void checkIdentity(benchmark::State& state) {
-    const Host host;
+    Host host;
     call(state, host, "CheckSoftwareIdentity",
          {{"Source", host.firstReference("Quenx_SoftwareIdentity")},
           {"Target", host.firstReference("Quenx_EthernetPort")}},
