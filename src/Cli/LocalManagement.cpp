@@ -7,6 +7,7 @@
 #include <system_error>
 
 #include "Cli/Failure.h"
+#include "Framework/Classes/CimBroker.h"
 #include "Framework/Classes/RequestScope.h"
 #include "MidAPI/ma.h"
 #include "Providers/UpdateInterfaces.h"
