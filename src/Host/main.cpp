@@ -35,9 +35,9 @@ class Signals {
         }
         return signal;
     }
-    /// 0 when none came in half a second.
+    /// 0 when none came in a tenth of a second: as long as a stop may last longer than what it waits for.
     int waitBriefly() const {
-        const timespec patience{0, 500000000};
+        const timespec patience{0, 100000000};
         const int signal = ::sigtimedwait(&m_set, nullptr, &patience);
         return signal < 0 ? 0 : signal;
     }
