@@ -2,7 +2,7 @@
 #include <benchmark/benchmark.h>
 #include <dlfcn.h>
 
-#include "Framework/Classes/Retirement.h"
+#include "Framework/Classes/InstanceReaper.h"
 #include "Framework/Requests/CimRequests.h"
 #include "InstantAdapters.h"
 #include "Providers/SoftwareUpdate/Quenx_ConcreteJob.h"
@@ -49,7 +49,7 @@ void call(benchmark::State& state, Host& host, const char* method,
             if (output.name != "Job") continue;
             host.requests().deleteInstance(std::get<core::CimPath>(*output.value.scalar()));
         }
-        core::drainRetired();
+        core::drainReaper();
         state.ResumeTiming();
     }
 }

@@ -9,6 +9,7 @@
 #include "Cli/Failure.h"
 #include "Framework/Classes/CimBroker.h"
 #include "Framework/Classes/RequestScope.h"
+#include "Framework/Model/CimInstance.h"
 #include "MidAPI/ma.h"
 #include "Providers/UpdateInterfaces.h"
 

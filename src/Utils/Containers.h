@@ -83,6 +83,16 @@ class QUENX_EXPORT SafeList {
         std::unique_ptr<IteratorImplementation> m_implementation;
     };
 
+    /// A derived list that keeps elements in its own way. What is done through the base reaches it too.
+    class ElementOwner {
+      public:
+        virtual void add(T element) = 0;
+        virtual void clear() = 0;
+
+      protected:
+        ~ElementOwner() = default;
+    };
+
     /// An owning list deletes its elements when it is cleared or destroyed.
     explicit SafeList(bool owning = false) : m_owning(owning) {}
     virtual ~SafeList();
@@ -104,11 +114,16 @@ class QUENX_EXPORT SafeList {
     std::list<T>& getStlList() QUENX_NO_THREAD_SAFETY_ANALYSIS { return m_elements; }
     Mutex& getMutex() QUENX_RETURN_CAPABILITY(m_mutex) { return m_mutex; }
 
+  protected:
+    /// For the derived list's constructor and destructor: from the one to the other, it is in charge.
+    void setElementOwner(ElementOwner* owner) { m_elementOwner = owner; }
+
   private:
     const bool m_owning;
     std::list<T> m_elements QUENX_GUARDED_BY(m_mutex);
     Mutex m_mutex;
     std::uint32_t m_clearCount QUENX_GUARDED_BY(m_mutex) = 0;
+    ElementOwner* m_elementOwner = nullptr;
 };
 
 template <typename T>
@@ -123,6 +138,7 @@ typename SafeList<T>::Iterator SafeList<T>::getElements() {
 
 template <typename T>
 void SafeList<T>::add(T element) {
+    if (m_elementOwner != nullptr) return m_elementOwner->add(element);
     Mutex::AutoLocker locker(m_mutex);
     m_elements.push_back(element);
 }
@@ -135,6 +151,7 @@ std::size_t SafeList<T>::size() {
 
 template <typename T>
 void SafeList<T>::clear() {
+    if (m_elementOwner != nullptr) return m_elementOwner->clear();
     Mutex::AutoLocker locker(m_mutex);
     ++m_clearCount;
     if (m_owning) {

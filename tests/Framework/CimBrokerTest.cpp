@@ -14,7 +14,7 @@ std::size_t countGadgets() {
     return core::GetCimBroker()->getInstances("test_GADGET", "").size();
 }
 
-TEST(CimBroker, AnAgentWaitsForTheRequestsThatUseIt) {
+TEST(CimBrokerTest, LetsAnAgentGoOnlyAfterTheRequestsThatUseIt) {
     auto agent = std::make_unique<test::GadgetAgent>();
     const test::Gadget* gadget = agent->add("held");
     std::promise<void> enumerated;

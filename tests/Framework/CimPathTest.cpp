@@ -6,7 +6,7 @@ namespace {
 
 using core::CimPath;
 
-TEST(CimPath, TextSurvivesReadingAndWriting) {
+TEST(CimPathTest, ReadsBackTheTextThatItWrites) {
     for (const char* text : {
              "root/cimv2:Quenx_Thing",
              "root/cimv2:Quenx_Thing.Name=\"a:b.c,d=e\",Number=5,Flag=TRUE,Low=-7",
@@ -20,7 +20,7 @@ TEST(CimPath, TextSurvivesReadingAndWriting) {
     }
 }
 
-TEST(CimPath, WhatDoesNotParseNamesNothingAndKeepsItsText) {
+TEST(CimPathTest, KeepsATextThatDoesNotParseAndNamesNothing) {
     for (const std::string& text :
          {std::string(), std::string("."), std::string("1Class"), std::string("Class."),
           std::string("Class.Key="), std::string("Class.Key=\"open"), std::string("Class.Key=\"end\\"),
@@ -34,7 +34,7 @@ TEST(CimPath, WhatDoesNotParseNamesNothingAndKeepsItsText) {
     }
 }
 
-TEST(CimPath, ComparesNamesWithoutCaseAndValuesByType) {
+TEST(CimPathTest, ComparesNamesWithoutCaseAndValuesByType) {
     struct Row {
         const char* left;
         const char* right;

@@ -7,7 +7,7 @@ namespace {
 using core::CimScalar;
 using core::CimType;
 
-TEST(CimValue, NumbersKeepToTheRangeOfTheirType) {
+TEST(CimValueTest, KeepsNumbersToTheRangeOfTheirType) {
     struct Row {
         CimType type;
         const char* text;
@@ -34,7 +34,7 @@ TEST(CimValue, NumbersKeepToTheRangeOfTheirType) {
     EXPECT_EQ(std::get<std::uint64_t>(*core::parseScalar(CimType::Uint16, "0x1F4")), 500U);
 }
 
-TEST(CimValue, DatetimesAreReadBackAndAlways25Characters) {
+TEST(CimValueTest, ReadsBackDatetimesOf25Characters) {
     EXPECT_EQ(core::datetimeText(utils::Time(90061002003ULL)), "00000001010101.002000:000");
     EXPECT_EQ(core::datetimeText(utils::Time(~0ULL)).size(), 25U);
     EXPECT_EQ(core::datetimeText(utils::Time()).size(), 25U);
@@ -54,7 +54,7 @@ TEST(CimValue, DatetimesAreReadBackAndAlways25Characters) {
     }
 }
 
-TEST(CimValue, ConversionLosesNothing) {
+TEST(CimValueTest, ConvertsWithoutLoss) {
     EXPECT_TRUE(core::convertScalar(CimType::Uint16, CimScalar(std::int64_t{5})));
     EXPECT_FALSE(core::convertScalar(CimType::Uint16, CimScalar(std::int64_t{-5})));
     EXPECT_FALSE(core::convertScalar(CimType::Sint64, CimScalar(~std::uint64_t{0})));

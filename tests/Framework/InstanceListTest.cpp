@@ -6,7 +6,7 @@
 #include <cstdlib>
 
 #include "Framework/Classes/CimAgent.h"
-#include "Framework/Classes/Retirement.h"
+#include "Framework/Classes/InstanceReaper.h"
 #include "Support/TestModel.h"
 
 namespace {
@@ -27,7 +27,7 @@ class InstanceListTest : public ::testing::Test {
     }
 };
 
-TEST_F(InstanceListTest, AnIteratorHoldsWhatItWalks) {
+TEST_F(InstanceListTest, KeepsWhatAnIteratorWalks) {
     core::InstanceList list;
     list.add(new Gadget("a"));
     list.add(new Gadget("b"));
@@ -40,7 +40,7 @@ TEST_F(InstanceListTest, AnIteratorHoldsWhatItWalks) {
     EXPECT_THROW(static_cast<void>(iterator.first()), utils::Exception);
 }
 
-TEST_F(InstanceListTest, ADeletedInstanceIsGoneAtOnce) {
+TEST_F(InstanceListTest, DropsADeletedInstanceAtOnce) {
     core::InstanceList list;
     core::InstanceList built;
     auto* first = new Gadget("first");
@@ -54,18 +54,29 @@ TEST_F(InstanceListTest, ADeletedInstanceIsGoneAtOnce) {
     EXPECT_EQ(ids(before), std::vector<std::string>{"second"});
 }
 
+TEST_F(InstanceListTest, OwnsWhatIsAddedThroughItsBase) {
+    core::InstanceList list;
+    utils::SafeList<core::CimInstance*>& base = list;
+    list.add(new Gadget("a"));
+    base.add(new Gadget("b"));
+    EXPECT_EQ(ids(list.getElements(false)), (std::vector<std::string>{"a", "b"}));
+    base.clear();
+    EXPECT_EQ(Gadget::living, 0);
+    EXPECT_EQ(ids(list.getElements(false)), std::vector<std::string>());
+}
+
 struct Slow : Gadget {
     Slow() : Gadget("slow") { setDestructionWaits(); }
 };
 
-void retireOne() {
+void destroyOne() {
     core::InstanceList list;
     list.add(new Slow);
     list.clear();
-    core::drainRetired();
+    core::drainReaper();
 }
 
-TEST_F(InstanceListTest, InstancesCanBeRetiredUntilTheProcessHasEnded) {
+TEST_F(InstanceListTest, DestroysInstancesUntilTheProcessHasEnded) {
     // As an agent that is still loaded when the process ends. A process of its own: threads survive no fork.
     GTEST_FLAG_SET(death_test_style, "threadsafe");
     EXPECT_EXIT(
@@ -73,11 +84,11 @@ TEST_F(InstanceListTest, InstancesCanBeRetiredUntilTheProcessHasEnded) {
             alarm(60);
             const core::CimAgent agent("exit");
             std::atexit([] {
-                retireOne();
-                retireOne();
+                destroyOne();
+                destroyOne();
                 if (Gadget::living != 0) _exit(1);
             });
-            retireOne();
+            destroyOne();
             std::exit(0);
         },
         testing::ExitedWithCode(0), "");

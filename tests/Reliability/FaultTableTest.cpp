@@ -1,7 +1,7 @@
 // Every call that an update makes fails, throws or stalls, one at a time.
 #include <thread>
 
-#include "Framework/Classes/Retirement.h"
+#include "Framework/Classes/InstanceReaper.h"
 #include "Providers/SoftwareUpdate/UpdateTest.h"
 #include "Reliability/Effort.h"
 #include "Reliability/Interposed.h"
@@ -186,7 +186,7 @@ TEST_F(FaultTableTest, WithoutAnyThreadNobodyWaits) {
     EXPECT_TRUE(m_requests.enumerateInstanceNames("Quenx_ConcreteJob").empty());
     // The destructor, which waits, is left to whoever has to wait anyway.
     EXPECT_FALSE(test::SyslogCapture::contains("Destroying JobThread"));
-    core::drainRetired();
+    core::drainReaper();
     EXPECT_TRUE(test::SyslogCapture::contains("Destroying JobThread"));
     disarm();
 }

@@ -4,6 +4,7 @@
 #include <string>
 
 #include "Framework/Classes/CimBroker.h"
+#include "Framework/Model/CimInstance.h"
 #include "Framework/Model/CimProperties.h"
 #include "Framework/Model/CimPropertyRef.h"
 

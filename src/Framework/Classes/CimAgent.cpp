@@ -1,13 +1,14 @@
 #include "Framework/Classes/CimAgent.h"
 
 #include "Framework/Classes/CimBroker.h"
-#include "Framework/Classes/Retirement.h"
+#include "Framework/Classes/InstanceReaper.h"
+#include "Framework/Model/CimInstance.h"
 
 namespace core {
 
 CimAgent::CimAgent(std::string providerName) : m_providerName(std::move(providerName)) {
-    // An agent of static storage that is never unloaded retires its instances when the process exits.
-    prepareRetirement();
+    // An agent of static storage that is never unloaded destroys its instances when the process exits.
+    prepareReaper();
 }
 
 CimAgent::~CimAgent() {
@@ -40,7 +41,7 @@ void CimAgent::disableIndications(std::string className) {
 void CimAgent::leaveBroker() noexcept {
     GetCimBroker()->removeAgent(this);
     m_classes.clear();
-    drainRetired();
+    drainReaper();
 }
 
 }  // namespace core

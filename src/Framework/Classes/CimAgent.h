@@ -2,7 +2,7 @@
 
 #include <string>
 
-#include "Framework/Classes/CimClasses.h"
+#include "Framework/Classes/CimClass.h"
 
 namespace core {
 

@@ -3,6 +3,8 @@
 #include <algorithm>
 
 #include "Framework/Classes/RequestScope.h"
+#include "Framework/Model/CimInstance.h"
+#include "Framework/Model/CimPath.h"
 
 namespace core {
 

@@ -1,6 +1,18 @@
 #include "Framework/Classes/CimClass.h"
 
+#include "Framework/Model/CimType.h"
+
 namespace core {
+
+namespace {
+
+ClassChain undeclared(const std::string& name) {
+    auto declaration = std::make_shared<ClassDeclaration>();
+    declaration->name = name;
+    return {declaration};
+}
+
+}  // namespace
 
 CimClass::CimClass() = default;
 
@@ -16,5 +28,45 @@ void CimClass::enableIndications() {}
 void CimClass::disableIndications() {}
 
 CimClass::~CimClass() = default;
+
+CimClasses::CimClasses() = default;
+
+CimClasses::~CimClasses() {
+    clear();
+}
+
+void CimClasses::append(ServedClass served) {
+    served.name = served.object->getClassName();
+    served.chain = served.info == nullptr ? undeclared(served.name) : declarationsOf(*served.info);
+    auto kept = std::make_unique<ServedClass>(std::move(served));
+    const utils::Mutex::AutoLocker lock(m_mutex);
+    m_served.push_back(std::move(kept));
+}
+
+const ServedClass* CimClasses::find(std::string_view className) const {
+    for (const ServedClass* served : getAll()) {
+        if (sameName(served->name, className)) return served;
+    }
+    return nullptr;
+}
+
+std::vector<const ServedClass*> CimClasses::getAll() const {
+    const utils::Mutex::AutoLocker lock(m_mutex);
+    std::vector<const ServedClass*> all;
+    all.reserve(m_served.size());
+    for (const auto& served : m_served)
+        all.push_back(served.get());
+    return all;
+}
+
+void CimClasses::clear() {
+    std::vector<std::unique_ptr<ServedClass>> released;
+    {
+        const utils::Mutex::AutoLocker lock(m_mutex);
+        released.swap(m_served);
+    }
+    while (!released.empty())
+        released.pop_back();
+}
 
 }  // namespace core

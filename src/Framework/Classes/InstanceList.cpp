@@ -2,9 +2,9 @@
 
 #include <algorithm>
 
-#include "Framework/Classes/InstanceListLink.h"
+#include "Framework/Classes/InstanceReaper.h"
 #include "Framework/Classes/RequestScope.h"
-#include "Framework/Classes/Retirement.h"
+#include "Framework/Model/CimInstance.h"
 
 namespace core {
 
@@ -46,21 +46,33 @@ void holdInScope(std::shared_ptr<const void> object) {
 
 }  // namespace
 
-void InstanceListLink::remove(const CimInstance* instance) {
-    const utils::Mutex::AutoLocker lock(m_mutex);
-    if (m_list != nullptr) m_list->remove(instance);
-}
+class InstanceList::Link : public InstanceListLink {
+  public:
+    explicit Link(InstanceList* list) : m_list(list) {}
 
-void InstanceListLink::close() {
-    const utils::Mutex::AutoLocker lock(m_mutex);
-    m_list = nullptr;
-}
+    void remove(const CimInstance* instance) override {
+        const utils::Mutex::AutoLocker lock(m_mutex);
+        if (m_list != nullptr) m_list->remove(instance);
+    }
+    /// The list is about to go.
+    void close() {
+        const utils::Mutex::AutoLocker lock(m_mutex);
+        m_list = nullptr;
+    }
 
-InstanceList::InstanceList() : m_link(std::make_shared<InstanceListLink>(this)) {}
+  private:
+    utils::Mutex m_mutex;
+    InstanceList* m_list QUENX_GUARDED_BY(m_mutex);
+};
+
+InstanceList::InstanceList() : m_link(std::make_shared<Link>(this)) {
+    setElementOwner(this);
+}
 
 InstanceList::~InstanceList() {
     m_link->close();
     clear();
+    setElementOwner(nullptr);
 }
 
 InstanceList::Iterator InstanceList::getElements() {

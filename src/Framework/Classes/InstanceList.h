@@ -4,14 +4,16 @@
 #include <utility>
 #include <vector>
 
-#include "Framework/Model/CimInstance.h"
 #include "Utils/Containers.h"
 
 namespace core {
 
+class CimInstance;
+
 /// A class object's instances. Owns them: an element is destroyed when the list and every snapshot, iterator
 /// and request that holds it have let go. Thread-safe.
-class QUENX_EXPORT InstanceList : public utils::SafeList<CimInstance*> {
+class QUENX_EXPORT InstanceList : public utils::SafeList<CimInstance*>,
+                                  private utils::SafeList<CimInstance*>::ElementOwner {
   public:
     using Snapshot = std::vector<std::shared_ptr<CimInstance>>;
 
@@ -25,9 +27,9 @@ class QUENX_EXPORT InstanceList : public utils::SafeList<CimInstance*> {
     Iterator getElements(bool all);
 
     /// Appends and takes ownership, also when it throws. The calling thread's request scope holds it too.
-    void add(CimInstance* element);
+    void add(CimInstance* element) override;
     /// Lets go of every element.
-    void clear();
+    void clear() override;
     /// Lets go of one element; false when it is not listed.
     bool remove(const CimInstance* element);
     /// Takes over the other list's elements and lets go of its own, in one step: nobody sees half a list.
@@ -36,10 +38,11 @@ class QUENX_EXPORT InstanceList : public utils::SafeList<CimInstance*> {
 
   private:
     using SharedSnapshot = std::shared_ptr<const Snapshot>;
+    class Link;
 
     SharedSnapshot snapshot();
 
-    std::shared_ptr<InstanceListLink> m_link;
+    std::shared_ptr<Link> m_link;
     Snapshot m_held QUENX_GUARDED_BY(getMutex());
     SharedSnapshot m_cached QUENX_GUARDED_BY(getMutex());
 };

@@ -1,6 +1,7 @@
-#include "Framework/Classes/Retirement.h"
+#include "Framework/Classes/InstanceReaper.h"
 
 #include <condition_variable>
+#include <cstdint>
 #include <exception>
 #include <mutex>
 #include <thread>
@@ -10,14 +11,14 @@
 namespace core {
 
 /// The queue of instances to destroy, and the one thread that destroys them. The queue is linked through the
-/// instances, so that retiring never needs memory.
-class Retirement {
+/// instances, so that queueing one never needs memory.
+class InstanceReaper {
   public:
-    Retirement() = default;
-    Retirement(const Retirement&) = delete;
-    Retirement& operator=(const Retirement&) = delete;
+    InstanceReaper() = default;
+    InstanceReaper(const InstanceReaper&) = delete;
+    InstanceReaper& operator=(const InstanceReaper&) = delete;
 
-    ~Retirement() {
+    ~InstanceReaper() {
         drain();
         {
             const std::lock_guard lock(m_mutex);
@@ -27,9 +28,9 @@ class Retirement {
         if (m_thread.joinable()) m_thread.join();
     }
 
-    static Retirement& theOne() {
-        static Retirement retirement;
-        return retirement;
+    static InstanceReaper& theOne() {
+        static InstanceReaper reaper;
+        return reaper;
     }
 
     static bool waits(const CimInstance* instance) { return instance->m_destructionWaits; }
@@ -68,7 +69,7 @@ class Retirement {
 
     /// Under the lock.
     void append(CimInstance* instance) noexcept {
-        (m_last == nullptr ? m_first : m_last->m_nextRetired) = instance;
+        (m_last == nullptr ? m_first : m_last->m_nextToDestroy) = instance;
         m_last = instance;
     }
 
@@ -84,7 +85,7 @@ class Retirement {
     void destroyQueued(std::unique_lock<std::mutex>& lock) noexcept {
         while (m_first != nullptr) {
             CimInstance* instance = m_first;
-            m_first = instance->m_nextRetired;
+            m_first = instance->m_nextToDestroy;
             if (m_first == nullptr) m_last = nullptr;
             ++m_busy;
             lock.unlock();
@@ -100,29 +101,29 @@ class Retirement {
     std::thread m_thread;
     CimInstance* m_first = nullptr;
     CimInstance* m_last = nullptr;
-    unsigned m_busy = 0;  ///< how many are being destroyed
+    std::uint32_t m_busy = 0;  ///< how many are being destroyed
     bool m_ending = false;
 };
 
-void retireInstance(CimInstance* instance) noexcept {
+void destroyInstance(CimInstance* instance) noexcept {
     if (instance == nullptr) return;
-    if (Retirement::waits(instance)) {
-        Retirement::theOne().add(instance);
+    if (InstanceReaper::waits(instance)) {
+        InstanceReaper::theOne().add(instance);
     } else {
         delete instance;
     }
 }
 
-void prepareRetirement() {
-    Retirement::theOne();
+void prepareReaper() {
+    InstanceReaper::theOne();
 }
 
-void drainRetired() noexcept {
-    Retirement::theOne().drain();
+void drainReaper() noexcept {
+    InstanceReaper::theOne().drain();
 }
 
-bool isRetiring() noexcept {
-    return Retirement::theOne().isWorking();
+bool isReaperBusy() noexcept {
+    return InstanceReaper::theOne().isWorking();
 }
 
 }  // namespace core

@@ -8,21 +8,21 @@ class CimInstance;
 
 /// Destroys an instance that nobody holds any more: at once, or on a thread of its own when the instance's
 /// destructor waits. Never fails and never waits; where that thread cannot be had, the instance stays queued
-/// until the next retirement or the drain.
-void retireInstance(CimInstance* instance) noexcept;
+/// until the next one comes, or drainReaper().
+void destroyInstance(CimInstance* instance) noexcept;
 
 /// Makes sure that the thread's owner is built, and so destroyed after the object that is being built now.
-void prepareRetirement();
+void prepareReaper();
 
-/// Returns when every instance retired so far is destroyed, code of its library included.
-QUENX_EXPORT void drainRetired() noexcept;
+/// Returns when every instance that was queued is destroyed, code of its library included.
+QUENX_EXPORT void drainReaper() noexcept;
 
 /// Whether the thread still has instances to destroy.
-QUENX_EXPORT bool isRetiring() noexcept;
+QUENX_EXPORT bool isReaperBusy() noexcept;
 
 /// The deleter of listed instances.
 struct InstanceRelease {
-    void operator()(CimInstance* instance) const noexcept { retireInstance(instance); }
+    void operator()(CimInstance* instance) const noexcept { destroyInstance(instance); }
 };
 
 }  // namespace core

@@ -1,6 +1,5 @@
 #pragma once
 
-#include <new>
 #include <stdexcept>
 #include <string>
 #include <utility>
@@ -44,20 +43,17 @@ class QUENX_EXPORT CimError : public std::runtime_error {
     CimStatus m_status;
 };
 
-/// Runs the body of a request. Whatever it throws beside CimError becomes CimStatus::Failed, with the
-/// provider's own text; but the lack of memory passes, since there may be none to build an answer in.
+/// For a catch clause: throws what is being handled as CimError. What is none becomes CimStatus::Failed, with
+/// the provider's own text; but the lack of memory passes, since there may be none to build an answer in.
+[[noreturn]] QUENX_EXPORT void rethrowAsCimError();
+
+/// Runs the body of a request, so that it fails with CimError only.
 template <class Body>
 auto withCimErrors(Body&& body) {
     try {
         return std::forward<Body>(body)();
-    } catch (const CimError&) {
-        throw;
-    } catch (const std::bad_alloc&) {
-        throw;
-    } catch (const std::exception& failure) {
-        throw CimError(CimStatus::Failed, failure.what());
     } catch (...) {
-        throw CimError(CimStatus::Failed, "the provider failed without saying why");
+        rethrowAsCimError();
     }
 }
 

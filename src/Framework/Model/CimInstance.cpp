@@ -2,7 +2,6 @@
 
 #include <algorithm>
 
-#include "Framework/Classes/InstanceListLink.h"
 #include "Framework/Model/CimError.h"
 
 namespace core {
@@ -68,7 +67,7 @@ CimProperty* CimInstance::getPropertyByName(std::string_view name) const {
 }
 
 const PropertyShape& CimInstance::shape() const {
-    if (m_shape == nullptr) m_shape = shapeOf(m_classInfo, m_properties);
+    if (m_shape == nullptr) m_shape = shapeOf(m_properties);
     return *m_shape;
 }
 

@@ -15,8 +15,16 @@
 
 namespace core {
 
+class CimInstance;
 class CimProperty;
-class InstanceListLink;
+
+/// The way from an instance back to the list that serves it; outlives both.
+class InstanceListLink {
+  public:
+    virtual ~InstanceListLink() = default;
+    /// Takes the instance out of its list, if the list still exists.
+    virtual void remove(const CimInstance* instance) = 0;
+};
 
 /// Base of every instance class.
 ///
@@ -90,7 +98,7 @@ class QUENX_EXPORT CimInstance : public std::enable_shared_from_this<CimInstance
   private:
     friend class CimProperty;
     friend class InstanceList;
-    friend class Retirement;
+    friend class InstanceReaper;
     friend struct InstanceRelease;
 
     const PropertyShape& shape() const QUENX_REQUIRES(m_mutex);
@@ -109,7 +117,8 @@ class QUENX_EXPORT CimInstance : public std::enable_shared_from_this<CimInstance
     std::vector<std::pair<std::string, Method>> m_methods;
     const CimClassInfo* m_classInfo = nullptr;
     std::weak_ptr<InstanceListLink> m_list;  ///< set once, when the instance is added
-    CimInstance* m_nextRetired = nullptr;  ///< links the queue of instances to destroy, without an allocation
+    CimInstance* m_nextToDestroy =
+        nullptr;  ///< links the queue of instances to destroy, without an allocation
     bool m_destructionWaits = false;
     std::atomic<bool> m_deleted{false};
 };

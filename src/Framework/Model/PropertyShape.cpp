@@ -2,9 +2,9 @@
 
 #include <algorithm>
 #include <iterator>
-#include <map>
 #include <set>
 #include <string>
+#include <unordered_map>
 
 #include "Framework/Model/CimProperty.h"
 #include "Utils/Os/Linux/Thread.h"
@@ -27,32 +27,39 @@ PropertyShape findShape(const std::vector<CimProperty*>& properties) {
     return shape;
 }
 
-/// Shapes by the class's name and not its address, which another library may reuse after an unload.
+/// What a shape depends on, as one text. Neither the class nor its name would do: two classes may add
+/// properties of their own to one binding. Addresses would not do either, which another library may reuse
+/// after an unload.
+std::string signatureOf(const std::vector<CimProperty*>& properties) {
+    std::string signature;
+    signature.reserve(properties.size() * 24);
+    for (const CimProperty* property : properties) {
+        signature += property->getName();
+        signature += property->isKey() ? '!' : ';';
+    }
+    return signature;
+}
+
 class ShapeCache {
   public:
-    std::shared_ptr<const PropertyShape> find(const CimClassInfo& info,
-                                              const std::vector<CimProperty*>& properties) {
-        const Key key{info.name, properties.size()};
+    std::shared_ptr<const PropertyShape> find(const std::vector<CimProperty*>& properties) {
+        const std::string signature = signatureOf(properties);
         const utils::Mutex::AutoLocker lock(m_mutex);
-        auto& shape = m_shapes[key];
+        auto& shape = m_shapes[signature];
         if (shape == nullptr) shape = std::make_shared<const PropertyShape>(findShape(properties));
         return shape;
     }
 
   private:
-    using Key = std::pair<std::string, std::size_t>;
-
     utils::Mutex m_mutex;
-    std::map<Key, std::shared_ptr<const PropertyShape>> m_shapes QUENX_GUARDED_BY(m_mutex);
+    std::unordered_map<std::string, std::shared_ptr<const PropertyShape>> m_shapes QUENX_GUARDED_BY(m_mutex);
 };
 
 }  // namespace
 
-std::shared_ptr<const PropertyShape> shapeOf(const CimClassInfo* info,
-                                             const std::vector<CimProperty*>& properties) {
+std::shared_ptr<const PropertyShape> shapeOf(const std::vector<CimProperty*>& properties) {
     static ShapeCache cache;
-    if (info == nullptr) return std::make_shared<const PropertyShape>(findShape(properties));
-    return cache.find(*info, properties);
+    return cache.find(properties);
 }
 
 void recordDeclaration(const CimClassInfo& info, std::size_t propertyCount) {

@@ -17,10 +17,9 @@ struct PropertyShape {
     std::vector<std::size_t> keys;  ///< those of the served ones that are keys
 };
 
-/// The shape of instances of the class. Instances of one class have one shape, so it is found once for each
-/// class and number of properties, and remembered. Thread-safe.
-std::shared_ptr<const PropertyShape> shapeOf(const CimClassInfo* info,
-                                             const std::vector<CimProperty*>& properties);
+/// The shape of instances with these properties. Found once for all instances whose properties have the same
+/// names and keys in the same order, and remembered. Thread-safe.
+std::shared_ptr<const PropertyShape> shapeOf(const std::vector<CimProperty*>& properties);
 
 /// Where the properties of each class of a chain end, as the constructors of an instance report it.
 using DeclarationMarks = std::vector<std::pair<const CimClassInfo*, std::size_t>>;

@@ -6,6 +6,7 @@
 
 #include "Framework/Classes/InstanceList.h"
 #include "Framework/Model/CimError.h"
+#include "Framework/Model/CimInstance.h"
 #include "Framework/Model/CimPropertyRef.h"
 #include "Framework/Requests/CimRequests.h"
 #include "Framework/Requests/ServedClasses.h"

@@ -4,8 +4,8 @@
 #include "Framework/Model/CimError.h"
 #include "Framework/Model/CimInstance.h"
 #include "Framework/Requests/CimRequests.h"
+#include "Framework/Requests/DeclaredTypes.h"
 #include "Framework/Requests/ServedClasses.h"
-#include "Framework/Requests/TypedPath.h"
 #include "Utils/Exception.h"
 
 namespace core {
@@ -19,81 +19,6 @@ struct CallLists {
     CimPropertyList in;
     CimPropertyList out;
 };
-
-const Argument* findArgument(const std::vector<Argument>& arguments, std::string_view name) {
-    const auto found = std::find_if(arguments.begin(), arguments.end(),
-                                    [&](const Argument& argument) { return sameName(argument.name, name); });
-    return found == arguments.end() ? nullptr : &*found;
-}
-
-/// What a client may mix up within, such as the widths of integers.
-enum class Kind { Boolean, Text, Integer, Real, Datetime, Reference };
-
-Kind kindOf(CimType type) {
-    switch (type) {
-        case CimType::Boolean:
-            return Kind::Boolean;
-        case CimType::String:
-        case CimType::Char16:
-            return Kind::Text;
-        case CimType::Datetime:
-            return Kind::Datetime;
-        case CimType::Reference:
-            return Kind::Reference;
-        default:
-            return isReal(type) ? Kind::Real : Kind::Integer;
-    }
-}
-
-/// A path written as a text would be guessed at, so a reference is never read from one.
-std::optional<CimScalar> typedElement(CimType type, const CimScalar& value, const Argument& given) {
-    const auto* text = given.isUntyped ? std::get_if<std::string>(&value) : nullptr;
-    if (text != nullptr && type != CimType::Reference) return parseScalar(type, *text);
-    return kindOf(type) == kindOf(given.value.type) ? convertScalar(type, value) : std::nullopt;
-}
-
-/// The value as the declaration wants it; nothing where it is of another kind, or does not fit.
-std::optional<CimValue> typedValue(const ParameterDeclaration& declared, const Argument& given,
-                                   const ClassLookup& classes) {
-    if (given.value.isNull()) return CimValue::null(declared.type, declared.isArray);
-    const CimScalar* single = given.value.scalar();
-    if (single == nullptr && !declared.isArray) return std::nullopt;
-    std::vector<CimScalar> typed;
-    for (const CimScalar& each : single == nullptr ? *given.value.elements() : std::vector{*single}) {
-        auto value = typedElement(declared.type, each, given);
-        if (!value) return std::nullopt;
-        if (auto* path = std::get_if<CimPath>(&*value)) *path = typedReference(*path, classes);
-        typed.push_back(std::move(*value));
-    }
-    // An array of one element may come as the element alone.
-    if (declared.isArray) return CimValue::arrayOf(declared.type, std::move(typed));
-    return CimValue::of(declared.type, std::move(typed.front()));
-}
-
-/// The arguments with their declared names and types.
-std::vector<Argument> typedArguments(const MethodDeclaration& method, const std::vector<Argument>& arguments,
-                                     const ClassLookup& classes) {
-    std::vector<Argument> result;
-    for (const Argument& given : arguments) {
-        const auto declared =
-            std::find_if(method.parameters.begin(), method.parameters.end(),
-                         [&](const auto& parameter) { return sameName(parameter.name, given.name); });
-        if (declared == method.parameters.end()) {
-            throw CimError(CimStatus::InvalidParameter, method.name + " has no parameter " + given.name);
-        }
-        if (findArgument(result, declared->name) != nullptr) {
-            throw CimError(CimStatus::InvalidParameter, declared->name + " is given twice");
-        }
-        auto value = typedValue(*declared, given, classes);
-        if (!value) {
-            throw CimError(CimStatus::InvalidParameter,
-                           "parameter " + declared->name + " takes a value of type " +
-                               std::string(typeName(declared->type)) + (declared->isArray ? "[]" : ""));
-        }
-        result.push_back({declared->name, std::move(*value)});
-    }
-    return result;
-}
 
 /// A value that the client gives for an output parameter goes to the method with the outputs: it decides.
 CallLists listsFor(const MethodDeclaration& method, const std::vector<Argument>& arguments) {

@@ -2,8 +2,8 @@
 
 #include <functional>
 
-#include "Framework/Model/CimPath.h"
 #include "Framework/Model/ClassDeclaration.h"
+#include "Framework/Requests/RequestValues.h"
 
 namespace core {
 
@@ -16,8 +16,13 @@ using ClassLookup = std::function<ClassChain(const std::string&)>;
 /// parameter when the keys are not exactly those of the class or a text does not read as its key's type.
 QUENX_EXPORT CimPath typedPath(const CimPath& path, const ClassLookup& classes);
 
-/// The same for a path that an argument or a key holds: one that does not fit is left as it is, and equals
-/// nothing.
-CimPath typedReference(const CimPath& path, const ClassLookup& classes);
+/// The arguments with their declared names and types; references in them as typedPath() makes them, where
+/// they fit. CimError (invalid parameter) for one that the method does not declare or that comes twice, and
+/// for a value of another kind than declared. Integers may come in any width that holds the value.
+std::vector<Argument> typedArguments(const MethodDeclaration& method, const std::vector<Argument>& arguments,
+                                     const ClassLookup& classes);
+
+/// The argument of that name, without regard to case; null when it is not there.
+const Argument* findArgument(const std::vector<Argument>& arguments, std::string_view name);
 
 }  // namespace core

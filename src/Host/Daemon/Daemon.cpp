@@ -1,6 +1,6 @@
 #include "Host/Daemon/Daemon.h"
 
-#include "Framework/Classes/Retirement.h"
+#include "Framework/Classes/InstanceReaper.h"
 #include "Framework/Requests/CimRequests.h"
 #include "Host/Authentication/PamChecker.h"
 #include "Host/Authentication/UsersFile.h"
@@ -103,7 +103,7 @@ std::string Daemon::unfinished() {
     core::CimRequests requests(m_namespace);
     const std::vector<RunningJob> jobs = runningJobs(requests);
     if (!jobs.empty()) return "the flash of " + describe(jobs);
-    return core::isRetiring() ? "the flash of a job that was deleted" : "";
+    return core::isReaperBusy() ? "the flash of a job that was deleted" : "";
 }
 
 }  // namespace host

@@ -4,7 +4,7 @@
 #include <array>
 
 #include "Framework/Model/CimError.h"
-#include "Framework/Requests/TypedPath.h"
+#include "Framework/Requests/DeclaredTypes.h"
 
 namespace host {
 

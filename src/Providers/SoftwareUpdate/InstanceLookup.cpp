@@ -2,6 +2,7 @@
 
 #include "Framework/Classes/CimBroker.h"
 #include "Framework/Classes/InstanceList.h"
+#include "Framework/Model/CimInstance.h"
 #include "Providers/InventoryInterfaces.h"
 #include "Providers/SoftwareUpdate/InstallOptions.h"
 #include "Utils/Log.h"

@@ -2,7 +2,7 @@
 
 #include <thread>
 
-#include "Framework/Classes/Retirement.h"
+#include "Framework/Classes/InstanceReaper.h"
 #include "Providers/SoftwareUpdate/Quenx_ConcreteJobClass.h"
 #include "Providers/SoftwareUpdate/UpdateTest.h"
 #include "Providers/SoftwareUpdate/VerifyJobResult.h"
@@ -79,7 +79,7 @@ TEST_F(JobRegistryTest, DeletesJobsAndNothingElse) {
     EXPECT_EQ(install(m_uri, "eth1").returnValue, 2U);
     EXPECT_EQ(claim(), "eth0");
     m_backend->letGo();
-    core::drainRetired();
+    core::drainReaper();
     EXPECT_EQ(claim(), "");
     EXPECT_EQ(test::componentsOf("eth0"), "IMG_PXE 2, IMG_UEFI 1");
 }

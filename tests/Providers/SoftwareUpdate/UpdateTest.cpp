@@ -2,7 +2,7 @@
 
 #include <algorithm>
 
-#include "Framework/Classes/Retirement.h"
+#include "Framework/Classes/InstanceReaper.h"
 #include "Support/TestRoms.h"
 
 namespace test {
@@ -34,7 +34,7 @@ void UpdateTest::deleteJobs() const {
         m_requests.deleteInstance(job);
     }
     // Deleted while they ran: they end all the same.
-    core::drainRetired();
+    core::drainReaper();
 }
 
 std::string UpdateTest::file(const std::string& name, const std::vector<uint8_t>& content) const {
