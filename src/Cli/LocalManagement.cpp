@@ -67,44 +67,42 @@ std::string defaultStateDirectory(const std::string& adapterDescription) {
 }
 
 LocalManagement::LocalManagement(const LocalSettings& settings) {
-    if (!settings.configFile.empty()) {
-        requireReadable(settings.configFile, "configuration file");
-        config_.emplace(settings.configFile);
-    }
+    if (!settings.configFile.empty()) requireReadable(settings.configFile, "configuration file");
+    m_session.emplace(settings.configFile);
     selectAdapters(settings);
     if (settings.providerDirectory.empty()) {
-        loadProviders(providers_, core::ProviderLibraries::defaultDirectory(), ExitStatus::Failed);
+        loadProviders(m_session->libraries(), core::ProviderLibraries::defaultDirectory(),
+                      ExitStatus::Failed);
     } else {
-        loadProviders(providers_, settings.providerDirectory, ExitStatus::WrongUse);
+        loadProviders(m_session->libraries(), settings.providerDirectory, ExitStatus::WrongUse);
     }
-    requests_.emplace(utils::SMASHv2Config::getInstance()->getNamespace());
 }
 
 std::vector<core::InstanceValue> LocalManagement::enumerateInstances(const std::string& className) {
-    return requests_->enumerateInstances(className);
+    return operations().enumerateInstances(className);
 }
 
 std::vector<core::CimPath> LocalManagement::enumerateInstanceNames(const std::string& className) {
-    return requests_->enumerateInstanceNames(className);
+    return operations().enumerateInstanceNames(className);
 }
 
 core::InstanceValue LocalManagement::getInstance(const core::CimPath& path) {
-    return requests_->getInstance(path);
+    return operations().getInstance(path);
 }
 
 std::vector<core::InstanceValue> LocalManagement::associators(const core::CimPath& path,
                                                               const core::AssociationFilter& by) {
-    return requests_->associators(path, by);
+    return operations().associators(path, by);
 }
 
 std::vector<core::CimPath> LocalManagement::associatorNames(const core::CimPath& path,
                                                             const core::AssociationFilter& by) {
-    return requests_->associatorNames(path, by);
+    return operations().associatorNames(path, by);
 }
 
 core::MethodResult LocalManagement::invokeMethod(const core::CimPath& path, const std::string& method,
                                                  const std::vector<core::Argument>& arguments) {
-    return requests_->invokeMethod(path, method, arguments);
+    return operations().invokeMethod(path, method, arguments);
 }
 
 std::optional<std::uint32_t> LocalManagement::checkImage(const core::CimPath& service, const std::string& uri,
@@ -118,12 +116,12 @@ std::optional<std::uint32_t> LocalManagement::checkImage(const core::CimPath& se
 }
 
 void LocalManagement::deleteInstance(const core::CimPath& path) {
-    requests_->deleteInstance(path);
+    operations().deleteInstance(path);
 }
 
 std::vector<core::ClassDeclaration> LocalManagement::classes() {
     std::vector<core::ClassDeclaration> declarations;
-    for (const core::ClassChain& chain : requests_->enumerateClasses("", true))
+    for (const core::ClassChain& chain : operations().enumerateClasses("", true))
         declarations.push_back(*chain.front());
     return declarations;
 }

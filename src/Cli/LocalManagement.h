@@ -4,10 +4,7 @@
 #include <string>
 
 #include "Cli/Management.h"
-#include "Framework/Requests/CimRequests.h"
-#include "Framework/Requests/ProviderLibraries.h"
-#include "Utils/Os/Linux/LinuxOSLocker.h"
-#include "Utils/Os/Linux/SMASHv2Config.h"
+#include "Framework/Requests/ProviderSession.h"
 
 namespace cli {
 
@@ -43,11 +40,10 @@ class LocalManagement : public Management {
     bool sharesFiles() const override { return true; }
 
   private:
-    // Destroyed last to first: the providers leave before what they use.
-    std::optional<utils::SMASHv2Config> config_;
-    os::OSLockerLinux locker_;
-    core::ProviderLibraries providers_;
-    std::optional<core::CimRequests> requests_;
+    core::CimOperations& operations() { return *m_session->operations(); }
+
+    std::optional<core::ProviderSession>
+        m_session;  ///< from the time when its files are known to be readable
 };
 
 /// Where the simulated adapters of a description keep their flash unless told otherwise: the directory that

@@ -9,21 +9,21 @@ namespace core {
 
 namespace {
 
-constexpr const char* PREFIX = "libQuenx_";
-constexpr const char* SUFFIX = ".so";
+constexpr const char* kPrefix = "libQuenx_";
+constexpr const char* kSuffix = ".so";
 
 #ifdef QUENX_SANITIZED
 // A leak reported after unloading has no file and line unless the library stays mapped.
-constexpr int LOAD_FLAGS = RTLD_NOW | RTLD_LOCAL | RTLD_NODELETE;
+constexpr int kLoadFlags = RTLD_NOW | RTLD_LOCAL | RTLD_NODELETE;
 #else
-constexpr int LOAD_FLAGS = RTLD_NOW | RTLD_LOCAL;
+constexpr int kLoadFlags = RTLD_NOW | RTLD_LOCAL;
 #endif
 
 std::vector<std::filesystem::path> librariesIn(const std::string& directory) {
     std::vector<std::filesystem::path> files;
     for (const auto& entry : std::filesystem::directory_iterator(directory)) {
         const std::string name = entry.path().filename().string();
-        if (name.starts_with(PREFIX) && name.ends_with(SUFFIX)) files.push_back(entry.path());
+        if (name.starts_with(kPrefix) && name.ends_with(kSuffix)) files.push_back(entry.path());
     }
     std::sort(files.begin(), files.end());
     return files;
@@ -40,7 +40,7 @@ std::string loaderReason(const std::string& file) {
 
 std::string ProviderLibraries::defaultDirectory() {
     Dl_info own{};
-    dladdr(PREFIX, &own);
+    dladdr(kPrefix, &own);
     std::error_code error;
     return std::filesystem::weakly_canonical(own.dli_fname, error).parent_path().string();
 }
@@ -50,21 +50,21 @@ void ProviderLibraries::Close::operator()(void* handle) const {
 }
 
 ProviderLibraries::~ProviderLibraries() {
-    while (!handles_.empty())
-        handles_.pop_back();
+    while (!m_handles.empty())
+        m_handles.pop_back();
 }
 
 void ProviderLibraries::load(const std::string& directory) {
     for (const std::filesystem::path& file : librariesIn(directory)) {
         // An absolute path: a name without a slash would send the loader to its own search path.
         const std::string path = std::filesystem::absolute(file).string();
-        Handle handle(dlopen(path.c_str(), LOAD_FLAGS));
+        Handle handle(dlopen(path.c_str(), kLoadFlags));
         if (handle == nullptr) {
-            problems_.push_back({file.string(), loaderReason(path)});
+            m_problems.push_back({file.string(), loaderReason(path)});
             continue;
         }
-        handles_.push_back(std::move(handle));
-        loaded_.push_back(file.string());
+        m_handles.push_back(std::move(handle));
+        m_loaded.push_back(file.string());
     }
 }
 

@@ -33,8 +33,8 @@ class QUENX_EXPORT ProviderLibraries {
     void load(const std::string& directory);
 
     /// The files that are loaded.
-    const std::vector<std::string>& loaded() const { return loaded_; }
-    const std::vector<Problem>& problems() const { return problems_; }
+    const std::vector<std::string>& loaded() const { return m_loaded; }
+    const std::vector<Problem>& problems() const { return m_problems; }
 
   private:
     struct Close {
@@ -42,9 +42,9 @@ class QUENX_EXPORT ProviderLibraries {
     };
     using Handle = std::unique_ptr<void, Close>;
 
-    std::vector<Handle> handles_;
-    std::vector<std::string> loaded_;
-    std::vector<Problem> problems_;
+    std::vector<Handle> m_handles;
+    std::vector<std::string> m_loaded;
+    std::vector<Problem> m_problems;
 };
 
 }  // namespace core

@@ -1,7 +1,6 @@
 #include "Host/Daemon/Daemon.h"
 
 #include "Framework/Classes/InstanceReaper.h"
-#include "Framework/Requests/CimRequests.h"
 #include "Host/Authentication/PamChecker.h"
 #include "Host/Authentication/UsersFile.h"
 #include "Host/Daemon/Providers.h"
@@ -13,11 +12,9 @@
 
 namespace host {
 
-Daemon::Daemon(const Settings& settings) : m_settings(settings) {
-    if (!m_settings.providerConfiguration.empty()) m_configuration.emplace(m_settings.providerConfiguration);
+Daemon::Daemon(const Settings& settings) : m_settings(settings), m_session(settings.providerConfiguration) {
     if (!m_settings.adapters.empty()) ma::configureSimulator(m_settings.adapters, m_settings.adapterState);
-    loadProviders(m_providers, m_settings.providers);
-    m_namespace = utils::SMASHv2Config::getInstance()->getNamespace();
+    loadProviders(m_session.libraries(), m_settings.providers);
     m_dispatcher = makeDispatcher();
     m_authentication = makeAuthentication();
     m_server = std::make_unique<HttpServer>(m_settings.limits, *m_dispatcher, *m_authentication);
@@ -27,11 +24,11 @@ Daemon::Daemon(const Settings& settings) : m_settings(settings) {
 Daemon::~Daemon() = default;
 
 std::unique_ptr<Dispatcher> Daemon::makeDispatcher() const {
-    const auto implementation = std::make_shared<core::CimRequests>(m_namespace);
+    const auto implementation = m_session.operations();
     Dispatcher::Namespaces namespaces{implementation};
-    std::vector<std::string> names{m_namespace};
+    std::vector<std::string> names{implementation->getNamespace()};
     for (const char* name : {"interop", "root/interop"}) {
-        if (!core::sameName(name, m_namespace)) names.emplace_back(name);
+        if (!core::sameName(name, names.front())) names.emplace_back(name);
     }
     const auto model = std::make_shared<InteropModel>(names, os::getHostname());
     for (std::size_t i = 1; i < names.size(); ++i) {
@@ -100,8 +97,7 @@ std::string Daemon::unfinished() {
         return std::to_string(requests) + " requests in flight";
     }
     m_dispatcher->shutDown();
-    core::CimRequests requests(m_namespace);
-    const std::vector<RunningJob> jobs = runningJobs(requests);
+    const std::vector<RunningJob> jobs = runningJobs(*m_session.operations());
     if (!jobs.empty()) return "the flash of " + describe(jobs);
     return core::isReaperBusy() ? "the flash of a job that was deleted" : "";
 }

@@ -1,14 +1,11 @@
 #pragma once
 
 #include <memory>
-#include <optional>
 #include <string>
 
-#include "Framework/Requests/ProviderLibraries.h"
+#include "Framework/Requests/ProviderSession.h"
 #include "Host/Server/HttpServer.h"
 #include "Host/Settings.h"
-#include "Utils/Os/Linux/LinuxOSLocker.h"
-#include "Utils/Os/Linux/SMASHv2Config.h"
 
 namespace host {
 
@@ -46,10 +43,7 @@ class Daemon {
     const Settings m_settings;
     std::string m_places;
     // Destroyed last to first: the server lets go of its requests before the providers leave.
-    std::optional<utils::SMASHv2Config> m_configuration;
-    os::OSLockerLinux m_locker;
-    core::ProviderLibraries m_providers;
-    std::string m_namespace;
+    core::ProviderSession m_session;
     std::unique_ptr<Dispatcher> m_dispatcher;
     std::unique_ptr<Authentication> m_authentication;
     std::unique_ptr<HttpServer> m_server;
