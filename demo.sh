@@ -62,6 +62,7 @@ https_port = 0
 [tls]
 certificate = "$PWD/$scratch/cert.pem"
 key = "$PWD/$scratch/key.pem"
+generate = true
 [auth]
 method = "users"
 users_file = "$PWD/$scratch/users"

@@ -48,6 +48,7 @@ http_port = 0
 [tls]
 certificate = "$scratch/cert.pem"
 key = "$scratch/key.pem"
+generate = true
 [auth]
 method = "users"
 users_file = "$scratch/users"

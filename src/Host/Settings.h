@@ -34,6 +34,7 @@ struct ListenSettings {
 struct TlsSettings {
     std::string certificate = "/etc/quenx-cimd/cert.pem";
     std::string key = "/etc/quenx-cimd/key.pem";
+    bool generate = false;  ///< also at paths other than these, when neither file exists
 };
 
 struct AuthenticationSettings {

@@ -20,7 +20,7 @@ TEST(SettingsTest, MistakesInTheFileAreNamed) {
     Settings settings;
     const std::pair<const char*, const char*> table[] = {
         {"[listen]\n\nhttps_port = 65536\n",
-         ":3: listen.https_port is \"65536\"; it must be a number from 0 to"},
+         ":3: listen.https_port is \"65536\". It must be a number from 0 to"},
         {"[listen]\nhttps_port = -1\n", ":2: "},
         {"[listen]\nhttps_port = '1'\n", "must be a whole number"},
         {"[listen]\nhttp = 1\n", "must be true or false"},
@@ -111,9 +111,10 @@ TEST(ConfigCheckTest, LooksAtEveryFile) {
     const std::string key = folder / "new/key.pem";
     const std::string otherKey = folder / "other.pem";
     const std::string junk = folder.write("junk", "-----BEGIN CERTIFICATE-----\nx\n");
-    EXPECT_TRUE(host::makeTlsFiles(certificate, key));
-    EXPECT_FALSE(host::makeTlsFiles(certificate, key));
-    EXPECT_TRUE(host::makeTlsFiles(folder / "other-cert.pem", otherKey));
+    EXPECT_THROW(host::makeTlsFiles({certificate, key, false}), std::runtime_error);
+    EXPECT_TRUE(host::makeTlsFiles({certificate, key, true}));
+    EXPECT_FALSE(host::makeTlsFiles({certificate, key, false}));
+    EXPECT_TRUE(host::makeTlsFiles({folder / "other-cert.pem", otherKey, true}));
     struct stat status {};
     ASSERT_EQ(::stat(key.c_str(), &status), 0);
     EXPECT_EQ(status.st_mode & 0777U, 0600U);
@@ -127,7 +128,8 @@ TEST(ConfigCheckTest, LooksAtEveryFile) {
         {2, certificate, key, {"--providers-directory", folder.path()}},
         {2, certificate, key, {"--providers-directory", "/nonexistent"}},
         {0, certificate, key, {}},
-        {0, folder / "none", folder / "none", {}},
+        {0, folder / "none", folder / "none", {"--tls-generate"}},
+        {2, folder / "none", folder / "none", {}},
         {2, certificate, key, {"--listen-address", "localhost"}},
         {2, certificate, key, {"--daemon-lock-file", "/nonexistent/lock"}},
         {2, certificate, key, {"--auth-method", "users", "--auth-users-file", "/nonexistent"}},
@@ -137,6 +139,8 @@ TEST(ConfigCheckTest, LooksAtEveryFile) {
         {2, certificate, otherKey, {}},
         {2, certificate, junk, {}},
         {2, certificate, folder / "none", {}},
+        {2, certificate, folder / "none", {"--tls-generate"}},
+        {2, folder / "none", key, {}},
         {2, junk, key, {}},
         {2, key, key, {}},
     };
@@ -147,7 +151,7 @@ TEST(ConfigCheckTest, LooksAtEveryFile) {
         EXPECT_EQ(host::checkConfiguration(read(arguments).settings), row.status) << &row - table;
     }
     ::unlink(key.c_str());
-    EXPECT_THROW(host::makeTlsFiles(certificate, key), std::runtime_error);
+    EXPECT_THROW(host::makeTlsFiles({certificate, key, true}), std::runtime_error);
 }
 
 }  // namespace

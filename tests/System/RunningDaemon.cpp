@@ -15,7 +15,8 @@ RunningDaemon::RunningDaemon(const std::vector<std::string>& options,
     setPassword("admin");
     setPassword("guest", {"--reader"});
     m_folder.write("quenx-cimd.toml",
-                   "[listen]\nhttps_port = 0\nhttp = true\nhttp_port = 0\n[auth]\nmethod = 'users'\n");
+                   "[listen]\nhttps_port = 0\nhttp = true\nhttp_port = 0\n[tls]\ngenerate = "
+                   "true\n[auth]\nmethod = 'users'\n");
     m_folder.write("provider.conf", "");
     m_folder.write("adapters.toml", kTestAdapters);
     command.push_back(QUENX_CIMD);

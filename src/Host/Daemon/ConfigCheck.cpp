@@ -2,6 +2,8 @@
 
 #include <unistd.h>
 
+#include <cerrno>
+#include <cstring>
 #include <filesystem>
 #include <functional>
 #include <iostream>
@@ -21,17 +23,14 @@ namespace {
 namespace fs = std::filesystem;
 
 void checkTls(const TlsSettings& settings) {
-    const bool hasCertificate = fs::exists(settings.certificate);
-    if (hasCertificate != fs::exists(settings.key)) {
-        throw std::runtime_error("of " + settings.certificate + " and " + settings.key +
-                                 " only one is there");
-    }
-    if (hasCertificate) TlsIdentity(settings.certificate, settings.key);
+    if (!areTlsFilesToBeMade(settings)) TlsIdentity(settings.certificate, settings.key);
 }
 
-void requireReadable(const std::string& path) {
-    if (!path.empty() && ::access(path.c_str(), R_OK) != 0)
-        throw std::runtime_error(path + ": cannot be read");
+void requireConfiguration(const std::string& path) {
+    if (!path.empty() && ::access(path.c_str(), R_OK) != 0) {
+        throw std::runtime_error("Cannot read " + path + ": " + std::strerror(errno) +
+                                 ". Check providers.configuration.");
+    }
 }
 
 void checkAdapters(const Settings& settings) {
@@ -46,7 +45,7 @@ void checkLockFile(const std::string& file) {
     const fs::path directory = fs::absolute(file).parent_path();
     if (!fs::is_directory(directory)) {
         throw std::runtime_error("daemon.lock_file is " + file + ", but there is no directory " +
-                                 directory.string());
+                                 directory.string() + ". Make it, or set daemon.lock_file to another file.");
     }
 }
 
@@ -55,8 +54,9 @@ void checkAuthentication(const AuthenticationSettings& settings) {
     if (settings.method == "users") {
         readUsersFile(settings.usersFile);
     } else if (!fs::exists(kService)) {
-        std::cerr << "quenx-cimd: note: " << kService
-                  << " is missing, so PAM goes by its service \"other\"\n";
+        std::cerr << "quenx-cimd: Warning: " << kService
+                  << " does not exist, so PAM applies its service \"other\". "
+                  << "Copy the file from the installation.\n";
     }
 }
 
@@ -75,14 +75,14 @@ int checkConfiguration(const Settings& settings) {
     check([&] { Listener::checkAddress(settings.listen.address); });
     if (settings.listen.https) check([&] { checkTls(settings.tls); });
     check([&] { checkAuthentication(settings.authentication); });
-    check([&] { requireReadable(settings.providerConfiguration); });
+    check([&] { requireConfiguration(settings.providerConfiguration); });
     check([&] {
         core::ProviderLibraries providers;
         loadProviders(providers, settings.providers);
     });
     check([&] { checkAdapters(settings); });
     check([&] { checkLockFile(settings.lockFile); });
-    if (status == 0) std::cout << "The configuration is good.\n";
+    if (status == 0) std::cout << "The configuration is valid.\n";
     return status;
 }
 

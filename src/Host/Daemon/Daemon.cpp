@@ -65,7 +65,7 @@ void Daemon::readIdentity() {
 
 void Daemon::listen() {
     if (m_settings.listen.https) {
-        if (makeTlsFiles(m_settings.tls.certificate, m_settings.tls.key)) {
+        if (makeTlsFiles(m_settings.tls)) {
             report("made a self-signed certificate for " + os::getHostname() +
                    ", localhost and loopback: " + m_settings.tls.certificate);
         }

@@ -19,7 +19,7 @@ template <class... Cases>
 Overloaded(Cases...) -> Overloaded<Cases...>;
 
 [[noreturn]] void refuse(const SettingsField& field, const std::string& text, const std::string& right) {
-    throw std::runtime_error(field.key + " is \"" + text + "\"; it must be " + right);
+    throw std::runtime_error(field.key + " is \"" + text + "\". It must be " + right + ".");
 }
 
 std::uint64_t numberIn(const SettingsField& field, const std::string& text) {
@@ -71,61 +71,71 @@ std::string SettingsField::text() const {
 }
 
 std::vector<SettingsField> fieldsOf(Settings& s) {
-    return {
-        {"listen.address", &s.listen.address, 0, 0, "address to listen on"},
-        {"listen.https", &s.listen.https, 0, 0, "serve HTTPS"},
-        {"listen.https_port", &s.listen.httpsPort, 0, 65535, "its port; 0 takes a free one"},
-        {"listen.http", &s.listen.http, 0, 0, "serve plain HTTP too: passwords can be read on the way"},
-        {"listen.http_port", &s.listen.httpPort, 0, 65535, "its port; 0 takes a free one"},
-        {"tls.certificate", &s.tls.certificate, 0, 0,
-         "certificate chain (PEM); made if it and the key are missing"},
-        {"tls.key", &s.tls.key, 0, 0, "private key (PEM)"},
-        {"auth.method", &s.authentication.method, 0, 0, "pam or users"},
-        {"auth.users_file", &s.authentication.usersFile, 0, 0, "users and password hashes, for method users"},
-        {"auth.readers", &s.authentication.readers, 0, 0,
-         "who may read besides administrators, for method pam: names, @group, or * for all"},
-        {"auth.remember_seconds", &s.authentication.rememberFor, 0, 3600,
-         "how long verified credentials are remembered"},
-        {"limits.body_bytes", &s.limits.bodyBytes, 1024, kGibibyte, "body of a request"},
-        {"limits.anonymous_body_bytes", &s.limits.anonymousBodyBytes, 0, kGibibyte,
-         "body that is read of a request that is refused"},
-        {"limits.header_bytes", &s.limits.headerBytes, 4096, 1U << 20, "headers of a request"},
-        {"limits.connections", &s.limits.connections, 1, 4096, "connections, each with a thread"},
-        {"limits.connections_per_address", &s.limits.connectionsPerAddress, 1, 4096,
-         "connections from one address"},
-        {"limits.workers", &s.limits.workers, 1, 4096, "requests carried out at a time"},
-        {"limits.header_seconds", &s.limits.headerTime, 1, kDay, "for the headers of a request to arrive"},
-        {"limits.request_seconds", &s.limits.requestTime, 1, kDay,
-         "for a body to arrive, and for an answer to be taken"},
-        {"limits.idle_seconds", &s.limits.idleTime, 1, kDay, "between two requests on a connection"},
-        {"limits.enumerations", &s.pulls.open, 1, 100000, "enumerations that are open at a time"},
-        {"limits.enumeration_seconds", &s.pulls.timeout, 1, kDay, "between two pulls on an enumeration"},
-        {"limits.enumeration_most_seconds", &s.pulls.maxTimeout, 1, kDay,
-         "what a client may ask for instead"},
-        {"providers.directory", &s.providers, 0, 0, "where the provider libraries are"},
-        {"providers.configuration", &s.providerConfiguration, 0, 0,
-         "the providers' configuration, if not /etc/quenx-cimprovider.conf"},
-        {"adapters.description", &s.adapters, 0, 0, "description of simulated adapters"},
-        {"adapters.state", &s.adapterState, 0, 0, "directory in which they keep their flash"},
-        {"daemon.lock_file", &s.lockFile, 0, 0, "held while running, so that no second daemon starts"}};
+    return {{"listen.address", &s.listen.address, 0, 0, "address to listen on"},
+            {"listen.https", &s.listen.https, 0, 0, "serve HTTPS"},
+            {"listen.https_port", &s.listen.httpsPort, 0, 65535, "port for HTTPS; 0 picks a free one"},
+            {"listen.http", &s.listen.http, 0, 0, "serve plain HTTP too; it sends passwords in clear text"},
+            {"listen.http_port", &s.listen.httpPort, 0, 65535, "port for plain HTTP; 0 picks a free one"},
+            {"tls.certificate", &s.tls.certificate, 0, 0, "file with the certificate chain (PEM)"},
+            {"tls.key", &s.tls.key, 0, 0, "file with the private key (PEM)"},
+            {"tls.generate", &s.tls.generate, 0, 0,
+             "make a missing certificate and key, self-signed; those at the default paths are always made"},
+            {"auth.method", &s.authentication.method, 0, 0, "how passwords are checked: pam or users"},
+            {"auth.users_file", &s.authentication.usersFile, 0, 0,
+             "file with users and password hashes, for method users"},
+            {"auth.readers", &s.authentication.readers, 0, 0,
+             "who may read besides administrators, for method pam: user names, @group, or * for everybody"},
+            {"auth.remember_seconds", &s.authentication.rememberFor, 0, 3600,
+             "how long a verified password is remembered; 0 for not at all"},
+            {"limits.body_bytes", &s.limits.bodyBytes, 1024, kGibibyte, "largest request body"},
+            {"limits.anonymous_body_bytes", &s.limits.anonymousBodyBytes, 0, kGibibyte,
+             "how much is read of a request that is refused"},
+            {"limits.header_bytes", &s.limits.headerBytes, 4096, 1U << 20, "largest request headers"},
+            {"limits.connections", &s.limits.connections, 1, 4096,
+             "most connections at a time; each has a thread"},
+            {"limits.connections_per_address", &s.limits.connectionsPerAddress, 1, 4096,
+             "most connections from one address"},
+            {"limits.workers", &s.limits.workers, 1, 4096, "most requests carried out at a time"},
+            {"limits.header_seconds", &s.limits.headerTime, 1, kDay, "time for the headers to arrive"},
+            {"limits.request_seconds", &s.limits.requestTime, 1, kDay,
+             "time for a body to arrive, and for the client to take the answer"},
+            {"limits.idle_seconds", &s.limits.idleTime, 1, kDay, "time between two requests on a connection"},
+            {"limits.enumerations", &s.pulls.open, 1, 100000, "most open pull enumerations"},
+            {"limits.enumeration_seconds", &s.pulls.timeout, 1, kDay,
+             "time between two pulls, unless the client asks for another"},
+            {"limits.enumeration_most_seconds", &s.pulls.maxTimeout, 1, kDay,
+             "longest time between two pulls that a client may ask for"},
+            {"providers.directory", &s.providers, 0, 0, "directory of the provider libraries"},
+            {"providers.configuration", &s.providerConfiguration, 0, 0,
+             "the providers' own configuration file, instead of /etc/quenx-cimprovider.conf"},
+            {"adapters.description", &s.adapters, 0, 0,
+             "file that describes simulated adapters, instead of /etc/quenx-adapters.toml"},
+            {"adapters.state", &s.adapterState, 0, 0,
+             "directory in which they keep their flash, instead of /var/lib/quenx/adapters"},
+            {"daemon.lock_file", &s.lockFile, 0, 0, "file that is locked while quenx-cimd runs"}};
 }
 
 void checkSettings(const Settings& settings) {
     if (!settings.listen.https && !settings.listen.http) {
-        throw std::runtime_error("listen.https and listen.http are both false: nothing would be served");
+        throw std::runtime_error("listen.https and listen.http are both false. Set one of them to true.");
     }
     if (settings.authentication.method != "pam" && settings.authentication.method != "users") {
         throw std::runtime_error("auth.method is \"" + settings.authentication.method +
-                                 "\"; it must be \"pam\" or \"users\"");
+                                 "\". It must be \"pam\" or \"users\".");
     }
     if (settings.limits.anonymousBodyBytes > settings.limits.bodyBytes) {
-        throw std::runtime_error("limits.anonymous_body_bytes is larger than limits.body_bytes");
+        throw std::runtime_error(
+            "limits.anonymous_body_bytes is larger than limits.body_bytes. Lower it, or raise "
+            "limits.body_bytes.");
     }
     if (settings.pulls.timeout > settings.pulls.maxTimeout) {
-        throw std::runtime_error("limits.enumeration_seconds is larger than limits.enumeration_most_seconds");
+        throw std::runtime_error(
+            "limits.enumeration_seconds is larger than limits.enumeration_most_seconds. Lower it, or raise "
+            "limits.enumeration_most_seconds.");
     }
     if (settings.adapters.empty() != settings.adapterState.empty()) {
-        throw std::runtime_error("adapters.description and adapters.state go together");
+        throw std::runtime_error(
+            "Only one of adapters.description and adapters.state is set. Set both, or neither.");
     }
 }
 

@@ -26,7 +26,7 @@ constexpr std::time_t kLifetime = 3650 * kDay;
 
 void check(int status) {
     if (status < 0)
-        throw std::runtime_error(std::string("making a certificate: ") + ::gnutls_strerror(status));
+        throw std::runtime_error(std::string("Cannot make a certificate: ") + ::gnutls_strerror(status));
 }
 
 struct KeyCloser {
@@ -87,15 +87,20 @@ Certificate makeCertificate(gnutls_x509_privkey_t key) {
     return certificate;
 }
 
+[[noreturn]] void failToWrite(const std::string& path, const std::string& why) {
+    throw std::runtime_error("Cannot write " + path + ": " + why +
+                             ". Run as root, or set tls.certificate and tls.key to files that exist.");
+}
+
 void writeFile(const std::string& path, const gnutls_datum_t& content, mode_t mode) {
     const int fd = ::open(path.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, mode);
-    if (fd < 0) throw std::runtime_error(path + ": " + std::strerror(errno));
+    if (fd < 0) failToWrite(path, std::strerror(errno));
     const ssize_t written = ::write(fd, content.data, content.size);
     const int error = errno;
     ::close(fd);
     if (written != static_cast<ssize_t>(content.size)) {
         ::unlink(path.c_str());
-        throw std::runtime_error(path + ": " + std::strerror(error));
+        failToWrite(path, std::strerror(error));
     }
 }
 
@@ -109,22 +114,36 @@ void writePem(const std::string& path, const Object& object, Export&& exporter, 
 
 }  // namespace
 
-bool makeTlsFiles(const std::string& certificateFile, const std::string& keyFile) {
-    const bool hasCertificate = fs::exists(certificateFile);
-    const bool hasKey = fs::exists(keyFile);
+bool areTlsFilesToBeMade(const TlsSettings& settings) {
+    std::error_code unreadable;  // counts as missing here; reading it says why
+    const bool hasCertificate = fs::exists(settings.certificate, unreadable);
+    const bool hasKey = fs::exists(settings.key, unreadable);
     if (hasCertificate && hasKey) return false;
-    if (hasCertificate || hasKey) {
-        throw std::runtime_error((hasKey ? certificateFile : keyFile) + " is missing, but " +
-                                 (hasKey ? keyFile : certificateFile) +
-                                 " is there: give both, or neither to have them made");
-    }
-    for (const std::string& file : {certificateFile, keyFile}) {
-        if (fs::path(file).has_parent_path()) fs::create_directories(fs::path(file).parent_path());
+    const TlsSettings defaults;
+    const bool mayMake =
+        settings.generate || (settings.certificate == defaults.certificate && settings.key == defaults.key);
+    if (mayMake && !hasCertificate && !hasKey) return true;
+    const std::string missing =
+        hasCertificate ? "tls.key is " + settings.key : "tls.certificate is " + settings.certificate;
+    throw std::runtime_error(missing + ", which does not exist. " +
+                             (mayMake
+                                  ? "Restore it, or remove " +
+                                        (hasKey ? settings.key : settings.certificate) + " to have both made."
+                                  : "Correct the path, or set tls.generate = true to have it made."));
+}
+
+bool makeTlsFiles(const TlsSettings& settings) {
+    if (!areTlsFilesToBeMade(settings)) return false;
+    for (const std::string& file : {settings.certificate, settings.key}) {
+        std::error_code error;
+        const fs::path folder = fs::absolute(file).parent_path();
+        fs::create_directories(folder, error);
+        if (error) failToWrite(folder.string(), error.message());
     }
     const Key key = makeKey();
     const Certificate certificate = makeCertificate(key.get());
-    writePem(keyFile, key.get(), ::gnutls_x509_privkey_export2, 0600);
-    writePem(certificateFile, certificate.get(), ::gnutls_x509_crt_export2, 0644);
+    writePem(settings.key, key.get(), ::gnutls_x509_privkey_export2, 0600);
+    writePem(settings.certificate, certificate.get(), ::gnutls_x509_crt_export2, 0644);
     return true;
 }
 

@@ -5,6 +5,8 @@
 #include <memory>
 #include <string>
 
+#include "Host/Settings.h"
+
 namespace host {
 
 /// A certificate chain with its private key, as TLS presents it. Does not change once read.
@@ -34,9 +36,14 @@ class TlsIdentity {
     gnutls_privkey_t m_key = nullptr;
 };
 
-/// Makes a key (mode 0600) and a self-signed certificate for this machine's names where neither file exists,
-/// folder included; true when it did. The certificate is good for loopback and the machine's name, for ten
-/// years. Throws std::runtime_error, also when only one of the two is there.
-bool makeTlsFiles(const std::string& certificateFile, const std::string& keyFile);
+/// Whether certificate and key have yet to be made: neither exists, and their paths are the default ones or
+/// the settings ask for it. A path of the administrator's own may be misspelt, so nothing is made there
+/// unasked. Throws std::runtime_error when a file is missing that will not be made.
+bool areTlsFilesToBeMade(const TlsSettings& settings);
+
+/// Makes a key (mode 0600) and a self-signed certificate for this machine's names, folder included, where
+/// areTlsFilesToBeMade(); returns that. The certificate is good for loopback and the machine's name, for ten
+/// years. Throws std::runtime_error.
+bool makeTlsFiles(const TlsSettings& settings);
 
 }  // namespace host
