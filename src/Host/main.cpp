@@ -47,26 +47,27 @@ class Signals {
 };
 
 void serve(host::Daemon& daemon, const Signals& signals) {
-    host::ServiceManager::ready("serving " + daemon.places());
-    host::report("serving " + daemon.places());
+    const std::string serving = "Serving " + daemon.places();
+    host::ServiceManager::ready(serving);
+    host::report(serving);
     while (signals.wait() == SIGHUP) {
         host::ServiceManager::reloading();
         daemon.reload();
-        host::ServiceManager::ready("serving " + daemon.places());
+        host::ServiceManager::ready(serving);
     }
 }
 
 void stop(host::Daemon& daemon, const Signals& signals) {
-    host::report("stopping");
-    host::ServiceManager::stopping("stopping");
+    host::report("Stopping.");
+    host::ServiceManager::stopping("Stopping.");
     daemon.stopAccepting();
     std::string said;
     for (std::string rest = daemon.unfinished(); !rest.empty(); rest = daemon.unfinished()) {
-        if (rest != said) host::report("waiting for " + rest);
+        if (rest != said) host::report("Waiting for " + rest + ".");
         said = rest;
-        host::ServiceManager::stillStopping("waiting for " + rest, kMoreSeconds);
+        host::ServiceManager::stillStopping("Waiting for " + rest + ".", kMoreSeconds);
         // An adapter that is written to half is worse than a slow stop.
-        if (signals.waitBriefly() != 0) host::report("asked again to stop; still waiting for " + rest);
+        if (signals.waitBriefly() != 0) host::report("Asked again to stop. Still waiting for " + rest + ".");
     }
 }
 
@@ -82,7 +83,7 @@ int run(const host::Settings& settings) {
         host::reportProblem(error.what());
         return 1;
     }
-    host::report("stopped");
+    host::report("Stopped.");
     return 0;
 }
 

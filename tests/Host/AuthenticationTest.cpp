@@ -62,7 +62,7 @@ TEST(UsersFileTest, RefusesAFileOfAnotherUser) {
     const std::string file = folder.write("users", "");
     ASSERT_EQ(::chmod(file.c_str(), 0600), 0);
     ASSERT_EQ(::chown(file.c_str(), 1, 1), 0);
-    EXPECT_NE(problem(file).find("belongs to somebody else"), std::string::npos) << problem(file);
+    EXPECT_NE(problem(file).find("Run: chown root"), std::string::npos) << problem(file);
 }
 
 TEST(UsersFileTest, SaysWhatIsWrongWithAFile) {
@@ -72,15 +72,15 @@ TEST(UsersFileTest, SaysWhatIsWrongWithAFile) {
     EXPECT_NE(problem(file).find("chmod 600"), std::string::npos);
     ::chmod(file.c_str(), 0600);
     EXPECT_NE(problem(folder / "missing").find("missing: "), std::string::npos);
-    EXPECT_NE(problem(folder.path()).find("no regular file"), std::string::npos);
+    EXPECT_NE(problem(folder.path()).find("not a regular file"), std::string::npos);
     const std::string hash = host::hashPassword("x");
     folder.write("users", "# comment\n\nadmin:" + hash + ":admin\n");
     EXPECT_EQ(problem(file), "");
     const std::pair<std::string, std::string> table[] = {
         {"admin:" + hash + "\n", ":1: the role"},
-        {"\nadmin:secret:admin\n", ":2: no password hash"},
-        {":" + hash + ":admin\n", ":1: no user name"},
-        {"a:" + hash + ":admin\na:" + hash + ":admin\n", ":2: user a is there twice"}};
+        {"\nadmin:secret:admin\n", ":2: there is no password hash"},
+        {":" + hash + ":admin\n", ":1: expected name:hash:role"},
+        {"a:" + hash + ":admin\na:" + hash + ":admin\n", ":2: user \"a\" is listed twice"}};
     for (const auto& [content, expected] : table) {
         folder.write("users", content);
         EXPECT_NE(problem(file).find(expected), std::string::npos) << content;

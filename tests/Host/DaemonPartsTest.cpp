@@ -29,7 +29,7 @@ TEST(SettingsTest, MistakesInTheFileAreNamed) {
         {"[auth]\nreaders = [1]\n", "must be a text"},
         {"[listen]\nunknown = 1\n", ":2: there is no setting listen.unknown"},
         {"[unknown]\nx = 1\n", "unknown.x"},
-        {"https = true\n", "must stand in a [section]"},
+        {"https = true\n", "must be in a [section]"},
         {"[listen\n", ":1: "}};
     for (const auto& [content, expected] : table) {
         const std::string file = folder.write("bad", content);

@@ -181,21 +181,21 @@ TEST_P(StoppingTest, LetsAFlashEndBeforeItStops) {
     if (isDeleted) daemon.lines("di", job);
     daemon.program().send(SIGTERM);
     ASSERT_TRUE(daemon.program().waitFor(isDeleted
-                                             ? "waiting for the flash of a job that was deleted"
-                                             : "waiting for the flash of Quenx:FirmwareUpdate@Job#1 at "));
+                                             ? "Waiting for an update whose job was deleted."
+                                             : "Waiting for the update of Quenx:FirmwareUpdate@Job#1 at "));
     daemon.program().send(SIGTERM);
-    EXPECT_TRUE(daemon.program().waitFor("asked again to stop"));
+    EXPECT_TRUE(daemon.program().waitFor("Asked again to stop. Still waiting for "));
     flash.release();
     const ProgramResult result = daemon.program().finish();
     EXPECT_EQ(result.status, 0) << result.out;
-    EXPECT_TRUE(contains(result.out, "stopped")) << result.out;
+    EXPECT_TRUE(contains(result.out, "Stopped.")) << result.out;
 
     std::string told;
     char bytes[512];
     for (ssize_t length = 0; (length = ::recv(manager, bytes, sizeof bytes, MSG_DONTWAIT)) > 0;)
         told.append(bytes, static_cast<std::size_t>(length)).append("\n");
     ::close(manager);
-    for (const char* part : {"READY=1", "STOPPING=1", "EXTEND_TIMEOUT_USEC=30000000", "STATUS=waiting for"})
+    for (const char* part : {"READY=1", "STOPPING=1", "EXTEND_TIMEOUT_USEC=30000000", "STATUS=Waiting for"})
         EXPECT_TRUE(contains(told, part)) << told;
 }
 
@@ -213,9 +213,9 @@ TEST(DaemonTest, ReadsUsersAndCertificateAgain) {
     EXPECT_FALSE(isServed("later", false));
     std::filesystem::rename(daemon.folder() / "cert.pem", daemon.folder() / "old.pem");
     daemon.program().send(SIGHUP);
-    ASSERT_TRUE(daemon.program().waitFor("the certificate and key stay as they were"));
-    ASSERT_TRUE(contains(daemon.program().seen(), "read the users again"));
-    EXPECT_FALSE(contains(daemon.program().seen(), "read the certificate"));
+    ASSERT_TRUE(daemon.program().waitFor("Kept the old certificate and key. Cannot use "));
+    ASSERT_TRUE(contains(daemon.program().seen(), "Reloaded the users."));
+    EXPECT_FALSE(contains(daemon.program().seen(), "Reloaded the certificate"));
     EXPECT_TRUE(isServed("later", false));
     std::filesystem::rename(daemon.folder() / "old.pem", daemon.folder() / "cert.pem");
     EXPECT_TRUE(isServed("admin", true));
@@ -338,8 +338,7 @@ TEST(DaemonTest, NamesWhatKeepsItFromServing) {
     }
     RunningDaemon daemon({"--providers-directory", folder.path()});
     EXPECT_EQ(daemon.lines("ein", "Quenx_EthernetPort").size(), 5U);
-    EXPECT_TRUE(contains(daemon.program().seen(), "libQuenx_Broken.so is not loaded: "))
-        << daemon.program().seen();
+    EXPECT_TRUE(contains(daemon.program().seen(), "libQuenx_Broken.so: ")) << daemon.program().seen();
 
     const auto started = [&](std::vector<std::string> options) {
         options.insert(options.begin(), {QUENX_CIMD, "--config", folder.write("empty", ""),
@@ -348,13 +347,13 @@ TEST(DaemonTest, NamesWhatKeepsItFromServing) {
     };
     const ProgramResult second = started({"--daemon-lock-file", daemon.folder() / "lock"});
     EXPECT_EQ(second.status, 1);
-    EXPECT_TRUE(contains(second.error, "is held by process " + std::to_string(daemon.program().id())))
+    EXPECT_TRUE(contains(second.error, "process " + std::to_string(daemon.program().id()) + " holds "))
         << second.error;
     const std::string lock = folder / "lock";
     const ProgramResult taken =
         started({"--daemon-lock-file", lock, "--listen-http-port", std::to_string(daemon.httpPort())});
     EXPECT_EQ(taken.status, 1);
-    EXPECT_TRUE(contains(taken.error, "cannot listen on 127.0.0.1 port ")) << taken.error;
+    EXPECT_TRUE(contains(taken.error, "Cannot listen on 127.0.0.1 port ")) << taken.error;
     // The lock is free again.
     const ProgramResult none = started(
         {"--daemon-lock-file", lock, "--listen-http-port", "0", "--providers-directory", "/nonexistent"});

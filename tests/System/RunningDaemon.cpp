@@ -32,7 +32,7 @@ RunningDaemon::RunningDaemon(const std::vector<std::string>& options,
         command.insert(command.end(), {option, m_folder / file});
     command.insert(command.end(), options.begin(), options.end());
     m_program = std::make_unique<Program>(command, Program::Output::Terminal, environment);
-    EXPECT_TRUE(m_program->waitFor("serving http")) << "the daemon does not start: " << m_program->seen();
+    EXPECT_TRUE(m_program->waitFor("Serving http")) << "the daemon does not start: " << m_program->seen();
     const auto portBehind = [&](const std::string& scheme) {
         return std::stoi(m_program->seen().substr(m_program->seen().find(scheme) + scheme.size()));
     };

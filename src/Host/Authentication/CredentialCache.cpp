@@ -22,7 +22,7 @@ CredentialCache::CredentialCache(std::chrono::seconds rememberFor) : m_rememberF
 void CredentialCache::clear() {
     Digest key{};
     if (::gnutls_rnd(GNUTLS_RND_KEY, key.data(), key.size()) != 0) {
-        throw std::runtime_error("no random numbers for a key");
+        throw std::runtime_error("Cannot get random numbers for a key");
     }
     const utils::Mutex::AutoLocker lock(m_mutex);
     ++m_generation;
@@ -43,7 +43,7 @@ CredentialCache::Digest CredentialCache::digestOf(const Credentials& credentials
     Digest digest{};
     if (::gnutls_hmac_fast(GNUTLS_MAC_SHA256, m_key.data(), m_key.size(), text.data(), text.size(),
                            digest.data()) != 0) {
-        throw std::runtime_error("credentials cannot be hashed");
+        throw std::runtime_error("Cannot hash the credentials");
     }
     return digest;
 }

@@ -21,6 +21,11 @@ namespace {
     throw std::runtime_error(path + ": " + why);
 }
 
+[[noreturn]] void failToWrite(const std::string& path, int error) {
+    throw std::runtime_error("Cannot write " + path + ": " + std::strerror(error) +
+                             ". Run as root, or name another file with --users.");
+}
+
 /// Equal without telling by the time it takes where the difference is.
 bool sameHash(std::string_view left, std::string_view right) {
     int difference = left.size() == right.size() ? 0 : 1;
@@ -45,9 +50,10 @@ UserEntry readEntry(const std::string& path, std::size_t number, const std::stri
     std::getline(fields, name, ':');
     std::getline(fields, entry.hash, ':');
     std::getline(fields, role);
-    if (!isUserName(name)) fail(where, "no user name before the first colon");
-    if (!entry.hash.starts_with('$')) fail(where, "no password hash; `quenx-cimd passwd` makes one");
-    if (role != "admin" && role != "reader") fail(where, "the role must be admin or reader");
+    if (!isUserName(name)) fail(where, "expected name:hash:role, but there is no valid name.");
+    if (!entry.hash.starts_with('$'))
+        fail(where, "there is no password hash. Set a password with: quenx-cimd passwd " + name);
+    if (role != "admin" && role != "reader") fail(where, "the role must be admin or reader.");
     entry.isAdministrator = role == "admin";
     return entry;
 }
@@ -56,14 +62,16 @@ UserEntry readEntry(const std::string& path, std::size_t number, const std::stri
 void checkMode(const std::string& path) {
     struct stat status {};
     if (::stat(path.c_str(), &status) != 0) {
-        fail(path,
-             std::strerror(errno) +
-                 (errno == ENOENT ? "; make it with `quenx-cimd passwd --users " + path + " NAME`" : ""));
+        const int error = errno;
+        throw std::runtime_error("Cannot read the users file " + path + ": " + std::strerror(error) +
+                                 (error == ENOENT
+                                      ? ". Add a user with: quenx-cimd passwd --users " + path + " NAME"
+                                      : ". Check auth.users_file."));
     }
-    if (!S_ISREG(status.st_mode)) fail(path, "is no regular file");
-    if ((status.st_mode & 077U) != 0) fail(path, "is open to group or others; chmod 600 it");
+    if (!S_ISREG(status.st_mode)) fail(path, "not a regular file. Check auth.users_file.");
+    if ((status.st_mode & 077U) != 0) fail(path, "others may read or change it. Run: chmod 600 " + path);
     if (status.st_uid != 0 && status.st_uid != ::geteuid()) {
-        fail(path, "belongs to somebody else than root or the user that the daemon runs as");
+        fail(path, "it belongs to neither root nor the user that runs quenx-cimd. Run: chown root " + path);
     }
 }
 
@@ -77,7 +85,7 @@ bool isUserName(const std::string& name) {
 UserEntries readUsersFile(const std::string& path) {
     checkMode(path);
     std::ifstream file(path);
-    if (!file) fail(path, "cannot be read");
+    if (!file) fail(path, "cannot be read. Run as root, or check auth.users_file.");
     UserEntries users;
     std::string line;
     for (std::size_t number = 1; std::getline(file, line); ++number) {
@@ -85,7 +93,8 @@ UserEntries readUsersFile(const std::string& path) {
         std::string name;
         UserEntry entry = readEntry(path, number, line, name);
         if (!users.emplace(name, std::move(entry)).second) {
-            fail(path + ":" + std::to_string(number), "user " + name + " is there twice");
+            fail(path + ":" + std::to_string(number),
+                 "user \"" + name + "\" is listed twice. Remove one of the lines.");
         }
     }
     return users;
@@ -101,22 +110,22 @@ void writeUsersFile(const std::string& path, const UserEntries& users) {
     const std::string fresh = path + ".new";
     ::unlink(fresh.c_str());
     const int fd = ::open(fresh.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0600);
-    if (fd < 0) fail(fresh, std::strerror(errno));
+    if (fd < 0) failToWrite(fresh, errno);
     const bool written =
         ::write(fd, text.data(), text.size()) == static_cast<ssize_t>(text.size()) && ::fsync(fd) == 0;
     const int reason = errno;
     ::close(fd);
-    if (!written) fail(fresh, std::strerror(reason));
-    if (::rename(fresh.c_str(), path.c_str()) != 0) fail(path, std::strerror(errno));
+    if (!written) failToWrite(fresh, reason);
+    if (::rename(fresh.c_str(), path.c_str()) != 0) failToWrite(path, errno);
 }
 
 std::string hashPassword(const std::string& password) {
     char setting[CRYPT_GENSALT_OUTPUT_SIZE];
     if (::crypt_gensalt_rn(nullptr, 0, nullptr, 0, setting, sizeof setting) == nullptr) {
-        throw std::runtime_error(std::string("no salt for a password: ") + std::strerror(errno));
+        throw std::runtime_error(std::string("Cannot make a salt for the password: ") + std::strerror(errno));
     }
     std::string hash = crypted(password, setting);
-    if (hash.starts_with('*')) throw std::runtime_error("the password cannot be hashed");
+    if (hash.starts_with('*')) throw std::runtime_error("Cannot hash the password. Use a shorter one.");
     return hash;
 }
 

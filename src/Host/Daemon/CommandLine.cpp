@@ -25,8 +25,7 @@ void addOptions(CLI::App& app, std::vector<GivenOption>& given) {
     for (GivenOption& each : given) {
         const std::string help = each.field.help + " [" + each.field.text() + "]";
         CLI::Option* option = app.add_option(each.field.option(), each.texts, help);
-        option->group("Settings (key " + each.field.key.substr(0, each.field.key.find('.')) +
-                      ".* of the file)");
+        option->group("Settings (" + each.field.key.substr(0, each.field.key.find('.')) + ".* in the file)");
         if (each.field.isFlag()) option->expected(0, 1)->default_str("true");
         if (!each.field.isList() && !each.field.isFlag()) option->expected(1);
         option->type_name(each.field.isFlag() ? "BOOL" : each.field.isText() ? "TEXT" : "NUMBER");
@@ -57,27 +56,28 @@ CommandLine readCommandLine(int argc, const char* const* argv) {
     CommandLine result;
     result.settings.providers = core::ProviderLibraries::defaultDirectory();
     CLI::App app(
-        "Serves firmware updates of Ethernet adapters over CIM-XML.\n"
-        "SIGTERM: take no more requests, answer those in flight, wait for flashes that have begun,\n"
-        "exit 0. A second SIGTERM shortens nothing. SIGHUP: read certificate and users again.\n"
-        "Exit status: 0 done, 1 failed, 2 wrong use, or a fault that --check-config finds.",
+        "Serves firmware updates of Ethernet adapters over CIM-XML.\n\n"
+        "Runs in the foreground until SIGTERM or SIGINT. It then finishes the requests and updates that "
+        "have\n"
+        "begun; a second signal does not hurry it. SIGHUP reloads the certificate, the key and the users.\n\n"
+        "Exit status: 0 success, 1 failure, 2 wrong use or a fault that --check-config found.\n",
         "quenx-cimd");
     app.set_version_flag("--version", QUENX_VERSION);
     std::string file;
-    app.add_option("--config", file, std::string("configuration file [") + kDefaultFile + " if it is there]");
-    app.add_flag("--check-config", result.checkOnly, "check the configuration and exit");
+    app.add_option("--config", file, std::string("configuration file [") + kDefaultFile + ", if it exists]");
+    app.add_flag("--check-config", result.checkOnly, "check all that a start needs, and exit");
     std::vector<GivenOption> given;
     for (const SettingsField& field : fieldsOf(result.settings))
         given.push_back({field, {}});
     addOptions(app, given);
 
     PasswdRequest passwd;
-    CLI::App* command = app.add_subcommand("passwd", "Set the password of a user in the users file.");
+    CLI::App* command = app.add_subcommand("passwd", "Add, change or remove a user of the users file.");
     command->fallthrough();
     command->add_option("USER", passwd.user, "name of the user")->required();
-    command->add_option("--users", passwd.usersFile, "the file [auth.users_file]");
-    command->add_flag("--reader", passwd.isReader, "may read only");
-    command->add_flag("--delete", passwd.remove, "take the user out");
+    command->add_option("--users", passwd.usersFile, "the users file [auth.users_file]");
+    command->add_flag("--reader", passwd.isReader, "the user may only read");
+    command->add_flag("--delete", passwd.remove, "remove the user");
     try {
         app.parse(argc, argv);
         readFile(file, result.settings);

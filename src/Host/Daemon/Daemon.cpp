@@ -66,8 +66,8 @@ void Daemon::readIdentity() {
 void Daemon::listen() {
     if (m_settings.listen.https) {
         if (makeTlsFiles(m_settings.tls)) {
-            report("made a self-signed certificate for " + os::getHostname() +
-                   ", localhost and loopback: " + m_settings.tls.certificate);
+            report("Made a self-signed certificate for " + os::getHostname() +
+                   ", localhost, 127.0.0.1 and ::1: " + m_settings.tls.certificate);
         }
         readIdentity();
         listenOn(m_settings.listen.httpsPort, true);
@@ -79,9 +79,9 @@ void Daemon::reload() {
     const auto again = [](const std::string& what, const auto& read) {
         try {
             read();
-            report("read the " + what + " again");
+            report("Reloaded the " + what + ".");
         } catch (const std::exception& error) {
-            reportProblem("the " + what + " stay as they were: " + error.what());
+            reportProblem("Kept the old " + what + ". " + error.what());
         }
     };
     again("users", [this] { m_authentication->reload(); });
@@ -94,12 +94,12 @@ void Daemon::stopAccepting() {
 
 std::string Daemon::unfinished() {
     if (const unsigned int requests = m_server->inFlight(); requests != 0) {
-        return std::to_string(requests) + " requests in flight";
+        return std::to_string(requests) + (requests == 1 ? " request" : " requests");
     }
     m_dispatcher->shutDown();
     const std::vector<RunningJob> jobs = runningJobs(*m_session.operations());
-    if (!jobs.empty()) return "the flash of " + describe(jobs);
-    return core::isReaperBusy() ? "the flash of a job that was deleted" : "";
+    if (!jobs.empty()) return "the update of " + describe(jobs);
+    return core::isReaperBusy() ? "an update whose job was deleted" : "";
 }
 
 }  // namespace host

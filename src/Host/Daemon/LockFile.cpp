@@ -20,22 +20,29 @@ std::string holderOf(int file) {
                        : "process " + std::string(text.data(), std::strcspn(text.data(), "\n"));
 }
 
+[[noreturn]] void failToWrite(const std::string& path, int error) {
+    throw std::runtime_error("Cannot write the lock file " + path + ": " + std::strerror(error) + ". " +
+                             (error == EACCES ? "Run as root, or set daemon.lock_file."
+                                              : "Set daemon.lock_file to a file that can be written."));
+}
+
 }  // namespace
 
 LockFile::LockFile(const std::string& path)
     : m_file(::open(path.c_str(), O_RDWR | O_CREAT | O_CLOEXEC, 0644)) {
-    if (m_file < 0) throw std::runtime_error(path + ": " + std::strerror(errno));
+    if (m_file < 0) failToWrite(path, errno);
     if (::flock(m_file, LOCK_EX | LOCK_NB) != 0) {
         const std::string holder = holderOf(m_file);
         ::close(m_file);
-        throw std::runtime_error("a daemon is running already: " + path + " is held by " + holder);
+        throw std::runtime_error("quenx-cimd is already running: " + holder + " holds " + path +
+                                 ". Stop it, or set daemon.lock_file to another file.");
     }
     // The file stays when we end: removing it would let two others lock two different files.
     const std::string text = std::to_string(::getpid()) + "\n";
     if (::ftruncate(m_file, 0) != 0 || ::pwrite(m_file, text.data(), text.size(), 0) < 0) {
         const int error = errno;
         ::close(m_file);
-        throw std::runtime_error(path + ": " + std::strerror(error));
+        failToWrite(path, error);
     }
 }
 

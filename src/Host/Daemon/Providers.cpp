@@ -9,19 +9,20 @@
 namespace host {
 
 void loadProviders(core::ProviderLibraries& providers, const std::string& directory) {
-    const std::string advice = "; providers.directory must name the directory of libQuenx_SoftwareUpdate.so";
+    const std::string advice = ". Set providers.directory to the directory of libQuenx_SoftwareUpdate.so.";
     try {
         providers.load(directory);
     } catch (const std::system_error& error) {
-        throw std::runtime_error(directory + ": " + error.code().message() + advice);
+        throw std::runtime_error("Cannot read the provider directory " + directory + ": " +
+                                 error.code().message() + advice);
     }
     for (const auto& problem : providers.problems())
-        reportProblem(problem.file + " is not loaded: " + problem.reason);
+        reportProblem("Cannot load " + problem.file + ": " + problem.reason);
     std::string names;
     for (const core::AgentUse& each : core::GetCimBroker()->useAgents())
         names += (names.empty() ? "" : ", ") + each.agent().getProviderName();
-    if (names.empty()) throw std::runtime_error(directory + " has no provider library" + advice);
-    report("providers: " + names);
+    if (names.empty()) throw std::runtime_error("There is no provider library in " + directory + advice);
+    report("Loaded the providers " + names + ".");
 }
 
 }  // namespace host

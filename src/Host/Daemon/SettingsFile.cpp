@@ -17,7 +17,7 @@ std::string textOf(const toml::node& node, const std::string& place) {
     if (const auto* text = node.as_string()) return text->get();
     if (const auto* number = node.as_integer()) return std::to_string(number->get());
     if (const auto* flag = node.as_boolean()) return flag->get() ? "true" : "false";
-    throw std::runtime_error(place + ": a text, a whole number, true or false is expected");
+    throw std::runtime_error(place + ": expected a text in quotes, a whole number, true or false");
 }
 
 void checkKind(const SettingsField& field, const toml::node& node) {
@@ -35,7 +35,8 @@ void checkKind(const SettingsField& field, const toml::node& node) {
 void setList(const SettingsField& field, const toml::node& node, const std::string& place) {
     std::get<std::vector<std::string>*>(field.target)->clear();
     const toml::array* elements = node.as_array();
-    if (elements == nullptr) throw std::runtime_error(field.key + " must be a list of texts");
+    if (elements == nullptr)
+        throw std::runtime_error(field.key + " must be a list of texts, such as [\"alice\"]");
     for (const toml::node& element : *elements) {
         checkKind(field, element);
         field.set(textOf(element, place));
@@ -46,7 +47,9 @@ void setField(const std::vector<SettingsField>& fields, const std::string& key, 
               const std::string& place) {
     const auto field = std::find_if(fields.begin(), fields.end(),
                                     [&](const SettingsField& each) { return each.key == key; });
-    if (field == fields.end()) throw std::runtime_error(place + ": there is no setting " + key);
+    if (field == fields.end())
+        throw std::runtime_error(place + ": there is no setting " + key +
+                                 ". See quenx-cimd --help for all settings.");
     try {
         if (field->isList()) {
             setList(*field, node, place);
@@ -80,7 +83,7 @@ void readSettingsFile(const std::string& file, Settings& settings) {
         const std::string place = placeOf(file, content.source());
         if (entries == nullptr) {
             throw std::runtime_error(place + ": " + std::string(section.str()) +
-                                     " must stand in a [section]");
+                                     " must be in a [section], such as [listen]");
         }
         for (const auto& [name, value] : *entries) {
             const std::string key = std::string(section.str()) + "." + std::string(name.str());

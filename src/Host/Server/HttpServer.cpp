@@ -124,7 +124,8 @@ void HttpServer::listen(Listener listener, bool tls) {
     options.push_back({MHD_OPTION_END, 0, nullptr});
     MHD_Daemon* daemon = ::MHD_start_daemon(flags, port, nullptr, nullptr, &Callbacks::request, this,
                                             MHD_OPTION_ARRAY, options.data(), MHD_OPTION_END);
-    if (daemon == nullptr) throw std::runtime_error("the HTTP server cannot be started");
+    if (daemon == nullptr)
+        throw std::runtime_error("Cannot start the HTTP server. The system log says more.");
     m_daemons.push_back(daemon);
 }
 

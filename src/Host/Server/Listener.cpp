@@ -33,8 +33,8 @@ SocketAddress addressOf(const std::string& text, std::uint16_t port) {
         address.length = sizeof *six;
     } else {
         throw std::runtime_error(
-            "\"" + text +
-            "\" is no IPv4 or IPv6 address to listen on; write one like 127.0.0.1, or 0.0.0.0 or :: for all");
+            "listen.address is \"" + text +
+            "\". It must be an IPv4 or IPv6 address such as 127.0.0.1, or 0.0.0.0 or :: for all.");
     }
     return address;
 }
@@ -63,8 +63,8 @@ Listener::Listener(const std::string& address, std::uint16_t port) {
         ::listen(m_socket, SOMAXCONN) != 0) {
         const int error = errno;
         if (m_socket >= 0) ::close(m_socket);
-        throw std::runtime_error("cannot listen on " + address + " port " + std::to_string(port) + ": " +
-                                 std::strerror(error));
+        throw std::runtime_error("Cannot listen on " + address + " port " + std::to_string(port) + ": " +
+                                 std::strerror(error) + ". Check listen.address and the ports.");
     }
     m_port = portOf(m_socket);
 }

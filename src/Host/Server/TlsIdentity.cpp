@@ -2,6 +2,8 @@
 
 #include <algorithm>
 #include <array>
+#include <cerrno>
+#include <cstring>
 #include <fstream>
 #include <iterator>
 #include <stdexcept>
@@ -12,7 +14,7 @@ namespace host {
 namespace {
 
 [[noreturn]] void fail(const std::string& file, const std::string& why) {
-    throw std::runtime_error(file + ": " + why);
+    throw std::runtime_error("Cannot use " + file + ": " + why + ". Check tls.certificate and tls.key.");
 }
 
 void check(int status, const std::string& file) {
@@ -21,7 +23,7 @@ void check(int status, const std::string& file) {
 
 std::string readWhole(const std::string& file) {
     std::ifstream stream(file, std::ios::binary);
-    if (!stream) fail(file, "cannot be read");
+    if (!stream) fail(file, std::strerror(errno));
     return {std::istreambuf_iterator<char>(stream), std::istreambuf_iterator<char>()};
 }
 
@@ -87,7 +89,7 @@ void TlsIdentity::checkPair(const std::string& certificateFile, const std::strin
         own, ::gnutls_pubkey_deinit);
     check(::gnutls_pubkey_import_privkey(own, m_key, 0, 0), keyFile);
     if (idOf(own, keyFile) != idOf(m_certificates[0].pubkey, certificateFile)) {
-        fail(keyFile, "is not the key of the certificate in " + certificateFile);
+        fail(keyFile, "it is not the key of the certificate in " + certificateFile);
     }
 }
 
