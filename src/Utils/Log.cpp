@@ -23,6 +23,7 @@ std::atomic<std::int32_t> logLevel{-1};
 namespace {
 
 constexpr const char* levelVariable = "TARVEL_SMASHv2_LOG_LEVEL";
+constexpr const char* copyVariable = "QUENX_LOG";
 constexpr const char* banner = "Quenx Management Provider, Tarvel, 2026";
 constexpr int backtraceDepth = 40;
 // logBacktrace itself, the writer that called it, and the writer's caller.
@@ -48,6 +49,13 @@ std::int32_t levelFromEnvironment() noexcept {
     if (text != nullptr && text[0] == '0') return 0;
     if (text != nullptr && text[0] == '2') return 2;
     return 1;
+}
+
+/// syslog's own copy to standard error serves where no system log runs. The console, syslog's way out there,
+/// is then left alone: in a container it is often the same terminal.
+int openOptions() noexcept {
+    const char* const text = os::getEnvVariable(copyVariable);
+    return text != nullptr && std::strcmp(text, "stderr") == 0 ? LOG_PERROR : LOG_CONS;
 }
 
 /// The line is handed to syslog as its format. Only the conversions that need no argument may stay, and no
@@ -91,7 +99,7 @@ void openLinuxLog() noexcept {
     std::lock_guard<std::mutex> lock(openMutex);
     if (logLevel.load() != -1) return;
     const std::int32_t level = levelFromEnvironment();
-    openlog("quenx", LOG_CONS, LOG_USER);
+    openlog("quenx", openOptions(), LOG_USER);
     syslog(LOG_NOTICE, "Opening log, level=%d", level);
     syslog(LOG_NOTICE, "%s", banner);
     logLevel.store(level);

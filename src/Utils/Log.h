@@ -16,7 +16,8 @@ namespace utils {
 QUENX_EXPORT extern std::atomic<std::int32_t> logLevel;
 
 /// Opens the system log and sets the level from the environment variable TARVEL_SMASHv2_LOG_LEVEL, on the
-/// first call only. The writers call it themselves.
+/// first call only. With QUENX_LOG=stderr every line also goes to standard error. The writers call it
+/// themselves.
 QUENX_EXPORT void openLinuxLog() noexcept;
 
 /// Writes one error line and a backtrace when the level is 1 or more. The message is a text, not a format.

@@ -330,6 +330,13 @@ TEST(DaemonTest, InstallsConfigurationWhereThereIsNone) {
     }
 }
 
+TEST(DaemonTest, CopiesItsLogToStandardErrorWhenAsked) {
+    RunningDaemon talkative({}, {"QUENX_LOG=stderr", "TARVEL_SMASHv2_LOG_LEVEL=2"});
+    EXPECT_TRUE(talkative.program().waitFor("quenx: [debug] \"Serving https://"));
+    RunningDaemon quiet({}, {"QUENX_LOG=", "TARVEL_SMASHv2_LOG_LEVEL=2"});
+    EXPECT_FALSE(contains(quiet.stop().out, "[debug]"));
+}
+
 TEST(DaemonTest, NamesWhatKeepsItFromServing) {
     const test::TempFolder folder;
     folder.write("libQuenx_Broken.so", "no library");
