@@ -7,8 +7,9 @@ mark_as_advanced(QUENX_CCACHE_PROGRAM)
 if(QUENX_CCACHE AND QUENX_CCACHE_PROGRAM AND NOT CMAKE_CXX_COMPILER_LAUNCHER)
     # ccache refuses to cache whatever uses precompiled headers until it is told that macros defined later and the times
     # of files do not matter. Here they do not: the headers are the standard library's, and no source asks for the time.
+    # Nor does the language of warnings, so that a script and a terminal share results.
     # The base folder makes paths relative, so that checkouts share results.
     set(CMAKE_CXX_COMPILER_LAUNCHER
-        env CCACHE_SLOPPINESS=pch_defines,time_macros,include_file_mtime,include_file_ctime
+        env CCACHE_SLOPPINESS=pch_defines,time_macros,include_file_mtime,include_file_ctime,locale
         CCACHE_BASEDIR=${PROJECT_SOURCE_DIR} CCACHE_NOHASHDIR=1 ${QUENX_CCACHE_PROGRAM})
 endif()
