@@ -309,8 +309,8 @@ TEST(DaemonTest, RunsWhereItIsInstalled) {
     }
     // The users file, too, has a directory that is not there yet.
     const std::string users = place / "etc/users";
-    EXPECT_EQ(test::run({"/bin/sh", "-c", "echo x | \"$0\" passwd ann --users \"$1\"",
-                         prefix + "/sbin/quenx-cimd", users})
+    EXPECT_EQ(test::run({"/bin/sh", "-c", "echo x | \"$0\" --config \"$1\" passwd ann --users \"$2\"",
+                         prefix + "/sbin/quenx-cimd", config, users})
                   .status,
               0);
     EXPECT_TRUE(std::filesystem::exists(users));

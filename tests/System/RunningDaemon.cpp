@@ -12,11 +12,11 @@ namespace test {
 
 RunningDaemon::RunningDaemon(const std::vector<std::string>& options,
                              const std::vector<std::string>& environment, std::vector<std::string> command) {
-    setPassword("admin");
-    setPassword("guest", {"--reader"});
     m_folder.write("quenx-cimd.toml",
                    "[listen]\nhttps_port = 0\nhttp = true\nhttp_port = 0\n[tls]\ngenerate = "
                    "true\n[auth]\nmethod = 'users'\n");
+    setPassword("admin");
+    setPassword("guest", {"--reader"});
     m_folder.write("provider.conf", "");
     m_folder.write("adapters.toml", kTestAdapters);
     command.push_back(QUENX_CIMD);
@@ -41,8 +41,17 @@ RunningDaemon::RunningDaemon(const std::vector<std::string>& options,
 }
 
 void RunningDaemon::setPassword(const std::string& name, const std::vector<std::string>& options) const {
-    std::vector<std::string> command{"/bin/sh", "-c",      "echo $0 | \"$@\"", name, QUENX_CIMD, "passwd",
-                                     name,      "--users", m_folder / "users"};
+    std::vector<std::string> command{"/bin/sh",
+                                     "-c",
+                                     "echo $0 | \"$@\"",
+                                     name,
+                                     QUENX_CIMD,
+                                     "--config",
+                                     m_folder / "quenx-cimd.toml",
+                                     "passwd",
+                                     name,
+                                     "--users",
+                                     m_folder / "users"};
     command.insert(command.end(), options.begin(), options.end());
     const ProgramResult result = run(command);
     EXPECT_EQ(result.status, 0) << result.error;

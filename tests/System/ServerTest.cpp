@@ -92,7 +92,8 @@ std::vector<std::string> comparable(const std::string& text) {
 
 TEST_F(Server, ShowsTheSameModelAsInProcess) {
     const auto inProcess = [&](std::vector<std::string> arguments) {
-        arguments.insert(arguments.begin(), {QUENXCTL, "--adapters", daemon_.folder() / "adapters.toml"});
+        arguments.insert(arguments.begin(), {QUENXCTL, "--adapters", daemon_.folder() / "adapters.toml",
+                                             "--config", daemon_.folder() / "provider.conf"});
         return test::run(arguments).out;
     };
     const std::string names = inProcess({"instances", "Quenx_EthernetPort", "--names"});
