@@ -4,10 +4,6 @@ constinit const core::CimClassInfo CIM_Controller::classInfo{
     "CIM_Controller", &CIM_LogicalDevice::classInfo, false, {}, &core::makeSample<CIM_Controller>};
 
 CIM_Controller::CIM_Controller() {
-    SystemCreationClassName.setKey();
-    SystemName.setKey();
-    CreationClassName.setKey();
-    DeviceID.setKey();
     declareClass(classInfo);
 }
 

@@ -4,10 +4,6 @@ constinit const core::CimClassInfo CIM_EthernetPort::classInfo{
     "CIM_EthernetPort", &CIM_NetworkPort::classInfo, false, {}, &core::makeSample<CIM_EthernetPort>};
 
 CIM_EthernetPort::CIM_EthernetPort() {
-    SystemCreationClassName.setKey();
-    SystemName.setKey();
-    CreationClassName.setKey();
-    DeviceID.setKey();
     declareClass(classInfo);
 }
 

@@ -4,10 +4,6 @@ constinit const core::CimClassInfo CIM_LogicalPort::classInfo{
     "CIM_LogicalPort", &CIM_LogicalDevice::classInfo, false, {}, &core::makeSample<CIM_LogicalPort>};
 
 CIM_LogicalPort::CIM_LogicalPort() {
-    SystemCreationClassName.setKey();
-    SystemName.setKey();
-    CreationClassName.setKey();
-    DeviceID.setKey();
     declareClass(classInfo);
 }
 

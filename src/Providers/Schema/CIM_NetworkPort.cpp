@@ -4,10 +4,6 @@ constinit const core::CimClassInfo CIM_NetworkPort::classInfo{
     "CIM_NetworkPort", &CIM_LogicalPort::classInfo, false, {}, &core::makeSample<CIM_NetworkPort>};
 
 CIM_NetworkPort::CIM_NetworkPort() {
-    SystemCreationClassName.setKey();
-    SystemName.setKey();
-    CreationClassName.setKey();
-    DeviceID.setKey();
     declareClass(classInfo);
 }
 

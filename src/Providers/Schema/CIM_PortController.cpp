@@ -4,10 +4,6 @@ constinit const core::CimClassInfo CIM_PortController::classInfo{
     "CIM_PortController", &CIM_Controller::classInfo, false, {}, &core::makeSample<CIM_PortController>};
 
 CIM_PortController::CIM_PortController() {
-    SystemCreationClassName.setKey();
-    SystemName.setKey();
-    CreationClassName.setKey();
-    DeviceID.setKey();
     declareClass(classInfo);
 }
 

@@ -8,10 +8,6 @@ constinit const core::CimClassInfo CIM_RemoteServiceAccessPoint::classInfo{
     &core::makeSample<CIM_RemoteServiceAccessPoint>};
 
 CIM_RemoteServiceAccessPoint::CIM_RemoteServiceAccessPoint() {
-    SystemCreationClassName.setKey();
-    SystemName.setKey();
-    CreationClassName.setKey();
-    Name.setKey();
     declareClass(classInfo);
 }
 

@@ -17,31 +17,4 @@ class QUENX_EXPORT CIM_RemoteServiceAccessPoint : public CIM_ServiceAccessPoint 
     core::CimPropertyString OtherInfoFormatDescription{"OtherInfoFormatDescription", this};
     core::CimPropertyUint16 AccessContext{"AccessContext", this};
     core::CimPropertyString OtherAccessContext{"OtherAccessContext", this};
-
-    // Repeated from the superclasses: the ones here are served.
-    core::CimPropertyString SystemCreationClassName{"SystemCreationClassName", this};
-    core::CimPropertyString SystemName{"SystemName", this};
-    core::CimPropertyString CreationClassName{"CreationClassName", this};
-    core::CimPropertyString Name{"Name", this};
-    core::CimPropertyUint16 EnabledState{"EnabledState", this};
-    core::CimPropertyString OtherEnabledState{"OtherEnabledState", this};
-    core::CimPropertyUint16 RequestedState{"RequestedState", this};
-    core::CimPropertyUint16 EnabledDefault{"EnabledDefault", this};
-    core::CimPropertyDatetime TimeOfLastStateChange{"TimeOfLastStateChange", this};
-    core::CimPropertyUint16_arr AvailableRequestedStates{"AvailableRequestedStates", this};
-    core::CimPropertyUint16 TransitioningToState{"TransitioningToState", this};
-    core::CimPropertyDatetime InstallDate{"InstallDate", this};
-    core::CimPropertyUint16_arr OperationalStatus{"OperationalStatus", this};
-    core::CimPropertyString_arr StatusDescriptions{"StatusDescriptions", this};
-    core::CimPropertyString Status{"Status", this};
-    core::CimPropertyUint16 HealthState{"HealthState", this};
-    core::CimPropertyUint16 CommunicationStatus{"CommunicationStatus", this};
-    core::CimPropertyUint16 DetailedStatus{"DetailedStatus", this};
-    core::CimPropertyUint16 OperatingStatus{"OperatingStatus", this};
-    core::CimPropertyUint16 PrimaryStatus{"PrimaryStatus", this};
-    core::CimPropertyString InstanceID{"InstanceID", this};
-    core::CimPropertyString Caption{"Caption", this};
-    core::CimPropertyString Description{"Description", this};
-    core::CimPropertyString ElementName{"ElementName", this};
-    core::CimPropertyUint64 Generation{"Generation", this};
 };

@@ -40,20 +40,4 @@ class QUENX_EXPORT CIM_SoftwareIdentity : public CIM_LogicalElement {
     core::CimPropertyUint16_arr TargetOSTypes{"TargetOSTypes", this};
     core::CimPropertyUint32 LargeBuildNumber{"LargeBuildNumber", this};
     core::CimPropertyBoolean IsLargeBuildNumber{"IsLargeBuildNumber", this};
-
-    // Repeated from the superclasses: the ones here are served.
-    core::CimPropertyDatetime InstallDate{"InstallDate", this};
-    core::CimPropertyString Name{"Name", this};
-    core::CimPropertyUint16_arr OperationalStatus{"OperationalStatus", this};
-    core::CimPropertyString_arr StatusDescriptions{"StatusDescriptions", this};
-    core::CimPropertyString Status{"Status", this};
-    core::CimPropertyUint16 HealthState{"HealthState", this};
-    core::CimPropertyUint16 CommunicationStatus{"CommunicationStatus", this};
-    core::CimPropertyUint16 DetailedStatus{"DetailedStatus", this};
-    core::CimPropertyUint16 OperatingStatus{"OperatingStatus", this};
-    core::CimPropertyUint16 PrimaryStatus{"PrimaryStatus", this};
-    core::CimPropertyString Caption{"Caption", this};
-    core::CimPropertyString Description{"Description", this};
-    core::CimPropertyString ElementName{"ElementName", this};
-    core::CimPropertyUint64 Generation{"Generation", this};
 };

@@ -8,10 +8,6 @@ constinit const core::CimClassInfo CIM_SoftwareIdentityResource::classInfo{
     &core::makeSample<CIM_SoftwareIdentityResource>};
 
 CIM_SoftwareIdentityResource::CIM_SoftwareIdentityResource() {
-    SystemCreationClassName.setKey();
-    SystemName.setKey();
-    CreationClassName.setKey();
-    Name.setKey();
     declareClass(classInfo);
 }
 

@@ -1,7 +1,8 @@
 #pragma once
 
 /// One class of the schema, as the DMTF's declarations and the rule of repetition make it; kept apart from
-/// the bindings, so that a row missing or swapped there shows.
+/// the bindings, so that a row missing or swapped there shows. The classes behind the service, its jobs and
+/// its associations repeat what they inherit, those of the inventory do not.
 struct SchemaRow {
     const char* name;
     const char* superclass;  ///< empty for a root
@@ -79,23 +80,23 @@ inline constexpr SchemaRow kSchemaTable[] = {
      "+Availability:Uint16 +StatusInfo:Uint16 +LastErrorCode:Uint32 +ErrorDescription:String "
      "+ErrorCleared:Boolean +OtherIdentifyingInfo:String_arr +PowerOnHours:Uint64 "
      "+TotalPowerOnHours:Uint64 +IdentifyingDescriptions:String_arr "
-     "+AdditionalAvailability:Uint16_arr +MaxQuiesceTime:Uint64 ..."},
+     "+AdditionalAvailability:Uint16_arr +MaxQuiesceTime:Uint64"},
     {"CIM_LogicalPort", "CIM_LogicalDevice",
      "+Speed:Uint64 +MaxSpeed:Uint64 +RequestedSpeed:Uint64 +UsageRestriction:Uint16 "
-     "+PortType:Uint16 +OtherPortType:String ..."},
+     "+PortType:Uint16 +OtherPortType:String"},
     {"CIM_NetworkPort", "CIM_LogicalPort",
-     "Speed:Uint64 +OtherNetworkPortType:String +PortNumber:Uint16 +LinkTechnology:Uint16 "
+     "+OtherNetworkPortType:String +PortNumber:Uint16 +LinkTechnology:Uint16 "
      "+OtherLinkTechnology:String +PermanentAddress:String +NetworkAddresses:String_arr "
      "+FullDuplex:Boolean +AutoSense:Boolean +SupportedMaximumTransmissionUnit:Uint64 "
-     "+ActiveMaximumTransmissionUnit:Uint64 ..."},
+     "+ActiveMaximumTransmissionUnit:Uint64"},
     {"CIM_EthernetPort", "CIM_NetworkPort",
-     "PortType:Uint16 NetworkAddresses:String_arr +MaxDataSize:Uint32 +Capabilities:Uint16_arr "
+     "+MaxDataSize:Uint32 +Capabilities:Uint16_arr "
      "+CapabilityDescriptions:String_arr +EnabledCapabilities:Uint16_arr "
-     "+OtherEnabledCapabilities:String_arr ..."},
+     "+OtherEnabledCapabilities:String_arr"},
     {"CIM_Controller", "CIM_LogicalDevice",
      "+TimeOfLastReset:Datetime +ProtocolSupported:Uint16 +MaxNumberControlled:Uint32 "
-     "+ProtocolDescription:String ..."},
-    {"CIM_PortController", "CIM_Controller", "+ControllerType:Uint16 +OtherControllerType:String ..."},
+     "+ProtocolDescription:String"},
+    {"CIM_PortController", "CIM_Controller", "+ControllerType:Uint16 +OtherControllerType:String"},
     {"CIM_SoftwareIdentity", "CIM_LogicalElement",
      "+InstanceID:String* +MajorVersion:Uint16 +MinorVersion:Uint16 +RevisionNumber:Uint16 "
      "+BuildNumber:Uint16 +VersionString:String +TargetOperatingSystems:String_arr "
@@ -105,18 +106,17 @@ inline constexpr SchemaRow kSchemaTable[] = {
      "+IsEntity:Boolean +ExtendedResourceType:Uint16 +OtherExtendedResourceTypeDescription:String "
      "+MinExtendedResourceTypeMajorVersion:Uint16 +MinExtendedResourceTypeMinorVersion:Uint16 "
      "+MinExtendedResourceTypeRevisionNumber:Uint16 +MinExtendedResourceTypeBuildNumber:Uint16 "
-     "+TargetOSTypes:Uint16_arr +LargeBuildNumber:Uint32 +IsLargeBuildNumber:Boolean ..."},
+     "+TargetOSTypes:Uint16_arr +LargeBuildNumber:Uint32 +IsLargeBuildNumber:Boolean"},
     {"CIM_ServiceAccessPoint", "CIM_EnabledLogicalElement",
-     "+SystemCreationClassName:String* +SystemName:String* +CreationClassName:String* +Name:String* "
-     "..."},
+     "+SystemCreationClassName:String* +SystemName:String* +CreationClassName:String* +Name:String*"},
     {"CIM_RemoteServiceAccessPoint", "CIM_ServiceAccessPoint",
      "+AccessInfo:String +InfoFormat:Uint16 +OtherInfoFormatDescription:String +AccessContext:Uint16 "
-     "+OtherAccessContext:String ..."},
+     "+OtherAccessContext:String"},
     {"CIM_SoftwareIdentityResource", "CIM_RemoteServiceAccessPoint",
      "+ResourceType:Uint16 +OtherResourceType:String +ExtendedResourceType:Uint16 "
      "+OtherExtendedResourceTypeDescription:String +ExtendedResourceTypeMajorVersion:Uint16 "
      "+ExtendedResourceTypeMinorVersion:Uint16 +ExtendedResourceTypeRevisionNumber:Uint16 "
-     "+ExtendedResourceTypeBuildNumber:Uint16 ..."},
+     "+ExtendedResourceTypeBuildNumber:Uint16"},
     {"CIM_ElementSoftwareIdentity", "CIM_Dependency",
      "+Antecedent:>CIM_SoftwareIdentity* Dependent:>CIM_ManagedElement* +UpgradeCondition:Uint16 "
      "+OtherUpgradeCondition:String +ElementSoftwareStatus:Uint16_arr"},

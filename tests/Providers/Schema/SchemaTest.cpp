@@ -65,7 +65,7 @@ std::string wordOf(core::CimProperty& property) {
            (property.isKey() ? "*" : "");
 }
 
-TEST(Schema, HasTheClassesOfTheTableWithTheirMembersInOrder) {
+TEST(SchemaTest, HasTheClassesOfTheTableWithTheirMembersInOrder) {
     const test::ProviderLibrary inventory(QUENX_INVENTORY_LIBRARY);
     const test::ProviderLibrary update(QUENX_UPDATE_LIBRARY);
     const auto classes = allClasses();
@@ -91,15 +91,19 @@ TEST(Schema, HasTheClassesOfTheTableWithTheirMembersInOrder) {
             next += isDeclared ? 1 : 0;
             own.push_back((isDeclared ? "+" : "") + word);
             EXPECT_TRUE(all[i]->IsNull()) << word;
-            EXPECT_EQ(instance->getPropertyByName(all[i]->getName()), all[i]) << "served is the last one";
+            EXPECT_EQ(instance->getPropertyByName(all[i]->getName()), all[i]) << "the last one is served";
         }
         EXPECT_EQ(own, wordsOf(row));
         EXPECT_EQ(next, declared.size());
-        EXPECT_EQ(instance->getProperties().size(), own.size());
+        // One property a name is served, however many levels declare it.
+        std::set<std::string> names;
+        for (const core::CimProperty* property : all)
+            names.insert(property->getName());
+        EXPECT_EQ(instance->getProperties().size(), names.size());
     }
 }
 
-TEST(Schema, DeclaresTheMethodsOfTheService) {
+TEST(SchemaTest, DeclaresTheMethodsOfTheService) {
     std::string text;
     const core::ClassChain chain = core::declarationsOf(CIM_SoftwareInstallationService::classInfo);
     for (const core::MethodDeclaration& method : chain.front()->methods) {
