@@ -59,3 +59,13 @@ function(quenx_library name)
     quenx_precompile(${name} library)
     target_link_options(${name} PRIVATE -Wl,--no-undefined-version -Wl,-z,relro,-z,now)
 endfunction()
+
+# quenx_provider(NAME SOURCES... [LINK targets...]): a library that a host loads, and that exports nothing. What it
+# exported would be bound to by whatever is loaded after it, the framework included, and would keep it mapped after
+# dlclose. The libraries below share their singletons and type information, so they keep their exports.
+function(quenx_provider name)
+    quenx_library(${name} ${ARGN})
+    set(script ${PROJECT_SOURCE_DIR}/cmake/ExportsNothing.map)
+    target_link_options(${name} PRIVATE -Wl,--version-script=${script})
+    set_target_properties(${name} PROPERTIES LINK_DEPENDS ${script})
+endfunction()

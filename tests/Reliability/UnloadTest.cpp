@@ -113,4 +113,27 @@ TEST_F(UnloadTest, TheEndOfTheProcessWaitsForTheFlash) {
         ::testing::ExitedWithCode(0), "Updating CapabilityWord");
 }
 
+/// What the plain host prints when it loads the libraries in this order and closes the one with that index
+/// first.
+std::string plainHost(const char* loadedFirst, const char* loadedSecond, int closedFirst) {
+    const std::string command = std::string(QUENX_PLAIN_HOST) + " " + loadedFirst + " " + loadedSecond + " " +
+                                QUENX_AGENT_COUNT + " " + std::to_string(closedFirst);
+    const std::unique_ptr<std::FILE, int (*)(std::FILE*)> output(popen(command.c_str(), "r"), pclose);
+    std::string text;
+    for (int c = std::fgetc(output.get()); c != EOF; c = std::fgetc(output.get()))
+        text += static_cast<char>(c);
+    return text;
+}
+
+TEST(PlainHostTest, LeavesNothingMappedWhicheverProviderItClosesFirst) {
+    if (!ProviderLibrary::isUnloadable()) GTEST_SKIP() << "sanitizer builds keep the library";
+    const std::string begin = "2 agents, mapped: 1 1\n";
+    const std::string end = "0 agents, mapped: 0 0\nany: 0\n";
+    for (const auto& [one, other] : {std::pair(QUENX_INVENTORY_LIBRARY, QUENX_UPDATE_LIBRARY),
+                                     std::pair(QUENX_UPDATE_LIBRARY, QUENX_INVENTORY_LIBRARY)}) {
+        EXPECT_EQ(plainHost(one, other, 0), begin + "1 agents, mapped: 0 1\n" + end) << one;
+        EXPECT_EQ(plainHost(one, other, 1), begin + "1 agents, mapped: 1 0\n" + end) << one;
+    }
+}
+
 }  // namespace
