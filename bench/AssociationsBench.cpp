@@ -15,7 +15,7 @@ class Model {
   public:
     Model(std::size_t ports, std::size_t jobs) : m_adapters(ports) {
         std::string uri = m_adapters.imageUri();
-        std::vector<unsigned short> options = {5};
+        std::vector<std::uint16_t> options = {5};
         std::vector<std::string> values;
         auto* registry = static_cast<Quenx_ConcreteJobClass*>(
             utils::Singleton<ConcreteJobFactory>::getInstance()->getCimClass());

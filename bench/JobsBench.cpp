@@ -15,7 +15,7 @@ class Jobs {
   public:
     explicit Jobs(std::size_t count) {
         std::string uri = m_adapters.imageUri();
-        std::vector<unsigned short> options = {5};
+        std::vector<std::uint16_t> options = {5};
         std::vector<std::string> values;
         auto* registry = static_cast<Quenx_ConcreteJobClass*>(
             utils::Singleton<ConcreteJobFactory>::getInstance()->getCimClass());

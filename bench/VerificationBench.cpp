@@ -64,7 +64,7 @@ void readOnce(benchmark::State& state) {
 void verify(benchmark::State& state) {
     const Fixture fixture;
     std::string uri = "file://" + fixture.path;
-    std::vector<unsigned short> options = {5};
+    std::vector<std::uint16_t> options = {5};
     std::vector<std::string> values;
     for (auto _ : state) {
         std::unique_ptr<std::uint8_t[]> image;

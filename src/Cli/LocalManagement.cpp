@@ -11,7 +11,7 @@
 #include "Framework/Classes/RequestScope.h"
 #include "Framework/Model/CimInstance.h"
 #include "MidAPI/ma.h"
-#include "Providers/UpdateInterfaces.h"
+#include "Providers/Schema/UpdateInterfaces.h"
 
 namespace cli {
 

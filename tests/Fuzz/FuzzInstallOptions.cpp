@@ -1,8 +1,8 @@
 #include <string>
 
 #include "Fuzz/Require.h"
+#include "Providers/SoftwareUpdate/MethodResults.h"
 #include "Providers/SoftwareUpdate/Quenx_ConcreteJob.h"
-#include "Providers/SoftwareUpdate/UpdateExceptions.h"
 #include "Utils/Utils.h"
 
 namespace {
@@ -12,17 +12,17 @@ struct Input {
     explicit Input(const std::string& text) {
         utils::StringArray lines = utils::split(text, '\n');
         for (const char c : lines.front())
-            options.push_back(c == 'T' ? 32768 : static_cast<unsigned short>(c - '0'));
+            options.push_back(c == 'T' ? 32768 : static_cast<std::uint16_t>(c - '0'));
         values.assign(lines.begin() + 1, lines.end());
     }
 
-    std::vector<unsigned short> options;
+    std::vector<std::uint16_t> options;
     std::vector<std::string> values;
 };
 
 }  // namespace
 
-extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
+extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, size_t size) {
     Input input(std::string(data, data + size));
     const Input before = input;
     Quenx_ConcreteJob::m_servicedAdapter = std::string("eth0");

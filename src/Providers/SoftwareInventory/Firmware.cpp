@@ -1,14 +1,20 @@
 #include "Providers/SoftwareInventory/Firmware.h"
 
+#include <sys/stat.h>
+
 #include <cinttypes>
 
+#include "MidAPI/Image/RomFormat.h"
+#include "Utils/Log.h"
+#include "Utils/Os/Linux/SMASHv2Config.h"
+#include "Utils/Os/Linux/linux.h"
 #include "Utils/Utils.h"
 
 namespace inventory {
 
 namespace {
 
-/// 64-bit FNV-1a: tells files apart that are kept side by side, and is no protection against a forger.
+/// 64-bit FNV-1a: tells files apart that are kept side by side, but does not protect against a forger.
 std::uint64_t hashOf(std::span<const std::uint8_t> bytes) {
     std::uint64_t hash = 0xcbf29ce484222325ULL;
     for (const std::uint8_t byte : bytes)
@@ -16,13 +22,42 @@ std::uint64_t hashOf(std::span<const std::uint8_t> bytes) {
     return hash;
 }
 
-std::vector<FirmwareComponent> named(const std::vector<utils::FirmwareVersionInfo>& components) {
+std::vector<FirmwareComponent> namedComponents(const std::vector<utils::FirmwareVersionInfo>& components) {
     std::vector<FirmwareComponent> result;
     for (const utils::FirmwareVersionInfo& component : components) {
         const std::string_view type = ma::firmwareTypeName(component.type);
         if (!type.empty()) result.push_back({std::string(type), component.version});
     }
     return result;
+}
+
+/// Larger than any chain of images of one card; keeps a stray disk image out of memory.
+constexpr std::int64_t kMaxFileSize = 256LL * 1024 * 1024;
+
+std::int64_t nanoseconds(const timespec& time) {
+    return static_cast<std::int64_t>(time.tv_sec) * 1'000'000'000 + time.tv_nsec;
+}
+
+bool hasSignature(std::span<const std::uint8_t> bytes) {
+    return bytes[0] == (ma::rom::kSignature & 0xff) && bytes[1] == ma::rom::kSignature >> 8;
+}
+
+/// The bytes of a file that begins as a ROM does; otherwise nothing, and the reason.
+std::vector<std::uint8_t> readRom(const std::string& path, std::int64_t size, std::string& problem) {
+    // Two bytes tell most other files apart, however large those are.
+    std::vector<std::uint8_t> bytes(2);
+    if (size > kMaxFileSize) {
+        problem = "it is too large for an option ROM";
+    } else if (os::readFile(path, bytes) != bytes.size()) {
+        problem = "it is empty or cannot be read";
+    } else if (!hasSignature(bytes)) {
+        problem = "it is not an option ROM";
+    } else {
+        bytes.resize(static_cast<std::size_t>(size));
+        if (os::readFile(path, bytes) == bytes.size()) return bytes;
+        problem = "it cannot be read to its end";
+    }
+    return {};
 }
 
 }  // namespace
@@ -32,7 +67,7 @@ Firmware describeImage(std::span<const std::uint8_t> file, const ma::RomFile& ro
     const ma::RomImage& first = rom.images.front();
     firmware.identifier = fmt("%04x-%04x-%016" PRIx64, first.vendorId, first.deviceId, hashOf(file));
     firmware.ids = ma::formatIds(first.vendorId, first.deviceId);
-    firmware.components = named(rom.components());
+    firmware.components = namedComponents(rom.components());
     for (const ma::RomImage& image : rom.images) {
         if (firmware.manufacturer.empty()) firmware.manufacturer = image.manufacturer;
         if (firmware.product.empty()) firmware.product = image.product;
@@ -45,10 +80,11 @@ std::vector<Firmware> readInstalled(const std::vector<Port>& ports) {
     for (const Port& port : ports) {
         const std::optional<ma::AdapterInfo> info = readInfo(port.adapter);
         if (!info) continue;
-        for (FirmwareComponent& component : named(info->components)) {
+        // Components are updated one by one, so each has an identity with a version of its own.
+        for (FirmwareComponent& component : namedComponents(info->components)) {
             Firmware firmware;
             firmware.identifier = port.adapter + ":" + component.type;
-            firmware.typeCode = SoftwareIdentity::INSTALLED_COMPONENT;
+            firmware.typeCode = SoftwareIdentity::InstalledComponent;
             firmware.adapter = port.adapter;
             firmware.ids = ma::formatIds(info->ids.vendor, info->ids.device);
             firmware.components.push_back(std::move(component));
@@ -56,6 +92,49 @@ std::vector<Firmware> readInstalled(const std::vector<Port>& ports) {
         }
     }
     return installed;
+}
+
+bool FirmwareCatalog::takeStamp(const std::string& path, Stamp& stamp) {
+    struct stat info {};
+    // One that is not there any more keeps its empty stamp, and reading it finds out.
+    if (::stat(path.c_str(), &info) != 0) return true;
+    if (!S_ISREG(info.st_mode)) return false;
+    stamp = {info.st_dev, info.st_ino, info.st_size, nanoseconds(info.st_mtim), nanoseconds(info.st_ctim)};
+    return true;
+}
+
+std::shared_ptr<const FirmwareFile> FirmwareCatalog::read(const std::string& path, std::int64_t size) {
+    QUENX_DEBUG("Reading firmware file '%s'", path.c_str());
+    std::string problem;
+    const std::vector<std::uint8_t> bytes = readRom(path, size, problem);
+    if (problem.empty()) {
+        const ma::RomFile rom = ma::parseOptionRom(bytes);
+        if (!rom.error) return std::make_shared<FirmwareFile>(FirmwareFile{path, describeImage(bytes, rom)});
+        problem = *rom.error;
+    }
+    QUENX_ERROR("Firmware file '%s' is skipped: %s", path.c_str(), problem.c_str());
+    return nullptr;
+}
+
+FirmwareCatalog::Files FirmwareCatalog::scan() {
+    const utils::StringArray directories = utils::SMASHv2Config::getInstance()->getFirmwareFilesPaths();
+    // Held while files are read, so that two requests at once do not read each new file twice.
+    const utils::Mutex::AutoLocker lock(m_mutex);
+    Files files;
+    Entries entries;
+    for (const std::string& directory : directories) {
+        for (const std::string& name : os::listDirectory(directory)) {
+            const std::string path = directory + "/" + name;
+            Stamp stamp;
+            if (entries.contains(path) || !takeStamp(path, stamp)) continue;
+            const auto old = m_known.find(path);
+            const bool isKnown = old != m_known.end() && old->second.stamp == stamp;
+            const Entry& entry = entries[path] = {stamp, isKnown ? old->second.file : read(path, stamp.size)};
+            if (entry.file != nullptr) files.push_back(entry.file);
+        }
+    }
+    m_known = std::move(entries);
+    return files;
 }
 
 }  // namespace inventory

@@ -1,13 +1,16 @@
 #pragma once
 
 #include <cstdint>
+#include <map>
+#include <memory>
 #include <span>
 #include <string>
 #include <vector>
 
 #include "MidAPI/Image/OptionRom.h"
-#include "Providers/InventoryInterfaces.h"
-#include "Providers/SoftwareInventory/AdapterReading.h"
+#include "Providers/Schema/InventoryInterfaces.h"
+#include "Providers/SoftwareInventory/Devices.h"
+#include "Utils/Os/Linux/Mutex.h"
 
 namespace inventory {
 
@@ -22,7 +25,7 @@ struct FirmwareComponent {
 /// What a software identity says, wherever the firmware is.
 struct Firmware {
     std::string identifier;
-    SoftwareIdentity::TypeCode typeCode = SoftwareIdentity::FIRMWARE_IMAGE;
+    SoftwareIdentity::TypeCode typeCode = SoftwareIdentity::FirmwareImage;
     std::string adapter;                        ///< on which it is installed; empty for a file
     std::string ids;                            ///< vendor and device, as "1af4:1041"
     std::vector<FirmwareComponent> components;  ///< in ascending order of type
@@ -39,5 +42,49 @@ Firmware describeImage(std::span<const std::uint8_t> file, const ma::RomFile& ro
 /// What is installed on the ports, one firmware for each component, so that each has its own version. A port
 /// that does not answer has none.
 std::vector<Firmware> readInstalled(const std::vector<Port>& ports);
+
+/// A file of intact ROM images, and what is in it.
+struct FirmwareFile {
+    std::string path;
+    Firmware firmware;
+
+    bool operator==(const FirmwareFile&) const = default;
+};
+
+/// The option-ROM files in the configured firmware directories. A file is read once and again only when it
+/// has changed; one that is broken or cannot be read is left out, with one log line when that is found out.
+/// Thread-safe.
+class FirmwareCatalog {
+  public:
+    using Files = std::vector<std::shared_ptr<const FirmwareFile>>;
+
+    /// The files that there are now, directory by directory in the configured order, by name in each.
+    Files scan();
+
+  private:
+    /// What changes with a file's content or with the right to read it. All zero for a file that is not
+    /// there.
+    struct Stamp {
+        std::uint64_t device = 0;
+        std::uint64_t inode = 0;
+        std::int64_t size = 0;
+        std::int64_t modified = 0;  ///< nanoseconds, as is the next
+        std::int64_t changed = 0;
+
+        bool operator==(const Stamp&) const = default;
+    };
+    struct Entry {
+        Stamp stamp;
+        std::shared_ptr<const FirmwareFile> file;  ///< null for one that is left out
+    };
+    using Entries = std::map<std::string, Entry>;
+
+    /// Takes the file's stamp. False for a directory, a device and the like.
+    static bool takeStamp(const std::string& path, Stamp& stamp);
+    static std::shared_ptr<const FirmwareFile> read(const std::string& path, std::int64_t size);
+
+    utils::Mutex m_mutex;
+    Entries m_known QUENX_GUARDED_BY(m_mutex);
+};
 
 }  // namespace inventory

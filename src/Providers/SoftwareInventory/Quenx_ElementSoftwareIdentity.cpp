@@ -1,10 +1,8 @@
 #include "Providers/SoftwareInventory/Quenx_ElementSoftwareIdentity.h"
 
 #include <map>
-#include <memory>
 
 #include "Framework/Classes/CimBroker.h"
-#include "Framework/Classes/InstanceList.h"
 #include "MidAPI/ma.h"
 #include "Providers/SoftwareInventory/Quenx_EthernetPort.h"
 #include "Providers/SoftwareInventory/Quenx_SoftwareIdentity.h"
@@ -28,15 +26,13 @@ std::map<std::string, Quenx_EthernetPort*> byAdapterName(core::InstanceRange& po
     return index;
 }
 
-std::unique_ptr<Quenx_ElementSoftwareIdentity> associate(const Quenx_SoftwareIdentity* identity,
-                                                         const Quenx_EthernetPort* port) {
-    auto association = std::make_unique<Quenx_ElementSoftwareIdentity>();
-    association->Antecedent = identity;
-    association->Dependent = port;
-    association->UpgradeCondition =
-        ma::getCanBeUpdated(port->getAdapterName()) ? 2 : 4;              // by the owner; never
-    association->ElementSoftwareStatus = std::vector<unsigned short>{2};  // current
-    return association;
+void associate(const Quenx_SoftwareIdentity* identity, const Quenx_EthernetPort* port, Rebuild& rebuilt) {
+    auto& association = rebuilt.add<Quenx_ElementSoftwareIdentity>();
+    association.Antecedent = identity;
+    association.Dependent = port;
+    association.UpgradeCondition =
+        ma::getCanBeUpdated(port->getAdapterName()) ? 2 : 4;            // by the owner; never
+    association.ElementSoftwareStatus = std::vector<std::uint16_t>{2};  // current
 }
 
 }  // namespace
@@ -54,24 +50,20 @@ std::string Quenx_ElementSoftwareIdentity::getClassName() const {
     return classInfo.name;
 }
 
-std::string Quenx_ElementSoftwareIdentityClass::getClassName() {
-    return Quenx_ElementSoftwareIdentity::classInfo.name;
-}
-
 utils::SafeList<core::CimInstance*>::Iterator Quenx_ElementSoftwareIdentityClass::getInstances() {
     QUENX_DEBUG("getInstances");
     const utils::TimeStamp time("Quenx_ElementSoftwareIdentityClass::getInstances");
-    core::InstanceRange ports =
-        ownInstances(Quenx_EthernetPort::classInfo);  // the ranges hold what they walk
+    // The ranges hold what the associations refer to.
+    core::InstanceRange ports = ownInstances(Quenx_EthernetPort::classInfo);
     core::InstanceRange identities = ownInstances(Quenx_SoftwareIdentity::classInfo);
     const auto portOf = byAdapterName(ports);
-    core::InstanceList rebuilt;
+    Rebuild rebuilt(m_instances);
     for (core::CimInstance* instance : identities) {
         const auto* const identity = dynamic_cast<Quenx_SoftwareIdentity*>(instance);
         if (identity == nullptr) continue;
         const auto port = portOf.find(identity->getAdapterName());
-        if (port != portOf.end()) rebuilt.add(associate(identity, port->second).release());
+        if (port != portOf.end()) associate(identity, port->second, rebuilt);
     }
-    m_list.publish(rebuilt);
-    return m_list.getElements(false);
+    rebuilt.publish();
+    return m_instances.getElements(false);
 }

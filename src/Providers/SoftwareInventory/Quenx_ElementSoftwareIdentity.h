@@ -1,6 +1,6 @@
 #pragma once
 
-#include "Framework/Classes/CimClass.h"
+#include "Providers/ClassObjects.h"
 #include "Providers/Schema/CIM_ElementSoftwareIdentity.h"
 
 /// What is installed (Antecedent) on a port (Dependent).
@@ -14,13 +14,7 @@ class Quenx_ElementSoftwareIdentity : public CIM_ElementSoftwareIdentity {
 };
 
 /// Serves an association for each installed component, rebuilt on every call.
-class Quenx_ElementSoftwareIdentityClass : public core::CimClass {
+class Quenx_ElementSoftwareIdentityClass : public ListedClass<Quenx_ElementSoftwareIdentity> {
   public:
-    using Instance = Quenx_ElementSoftwareIdentity;
-
-    std::string getClassName() override;
     utils::SafeList<core::CimInstance*>::Iterator getInstances() override;
-
-  private:
-    core::InstanceList m_list;
 };

@@ -1,7 +1,7 @@
 #include "Providers/SoftwareInventory/Quenx_EthernetPort.h"
 
 #include "MidAPI/ma.h"
-#include "Providers/SoftwareInventory/Device.h"
+#include "Providers/SoftwareInventory/Devices.h"
 #include "Utils/Debug.h"
 #include "Utils/Log.h"
 #include "Utils/Utils.h"
@@ -60,6 +60,7 @@ void Quenx_EthernetPort::setLink(const std::optional<ma::AdapterInfo>& info) {
     Description = info->description;
     PermanentAddress = addressText(info->permanentMac);
     NetworkAddresses = std::vector<std::string>{addressText(info->permanentMac)};
+    // A link that is down has no speed, which is not a speed of 0.
     if (info->speed != 0) {
         Speed = info->speed;
     } else {
@@ -75,12 +76,8 @@ utils::PCIAddr Quenx_EthernetPort::getPCIAddress() const {
     return m_port.address;
 }
 
-std::string Quenx_EthernetPortClass::getClassName() {
-    return Quenx_EthernetPort::classInfo.name;
-}
-
 utils::SafeList<core::CimInstance*>::Iterator Quenx_EthernetPortClass::getInstances() {
     QUENX_DEBUG("getInstances");
     const utils::TimeStamp time("Quenx_EthernetPortClass::getInstances");
-    return m_ports.getElements(inventory::readPorts());
+    return serve(inventory::readPorts());
 }

@@ -1,10 +1,9 @@
 #pragma once
 
-#include "Framework/Classes/CimClass.h"
-#include "Providers/InventoryInterfaces.h"
+#include "Providers/ClassObjects.h"
 #include "Providers/Schema/CIM_EthernetPort.h"
-#include "Providers/SoftwareInventory/AdapterReading.h"
-#include "Providers/SoftwareInventory/KeptInstances.h"
+#include "Providers/Schema/InventoryInterfaces.h"
+#include "Providers/SoftwareInventory/Devices.h"
 
 /// One port (one PCI function) of an Ethernet adapter.
 class Quenx_EthernetPort : public CIM_EthernetPort, public inventory::EthernetPort {
@@ -30,13 +29,7 @@ class Quenx_EthernetPort : public CIM_EthernetPort, public inventory::EthernetPo
 };
 
 /// Serves a port for each adapter name.
-class Quenx_EthernetPortClass : public core::CimClass {
+class Quenx_EthernetPortClass : public CachedClass<Quenx_EthernetPort, inventory::Port> {
   public:
-    using Instance = Quenx_EthernetPort;
-
-    std::string getClassName() override;
     utils::SafeList<core::CimInstance*>::Iterator getInstances() override;
-
-  private:
-    KeptInstances<Quenx_EthernetPort, inventory::Port> m_ports;
 };

@@ -24,10 +24,13 @@ void Quenx_EthernetPortRegisteredProfile::refresh() {
     RegisteredOrganization = 2;  // DMTF
     OtherRegisteredOrganization.setNull();
     RegisteredName = "Ethernet Port";
-    RegisteredVersion = "1.0.1";                      // of DSP1014
-    AdvertiseTypes = std::vector<unsigned short>{1};  // other
+    RegisteredVersion = "1.0.1";                     // of DSP1014
+    AdvertiseTypes = std::vector<std::uint16_t>{1};  // other
     AdvertiseTypeDescriptions = std::vector<std::string>{"WS-Identify"};
     Caption = RegisteredName;
     Description = "Ethernet Port Profile for Tarvel(R) Ethernet Adapters";
     ElementName.setNull();
 }
+
+Quenx_EthernetPortRegisteredProfileClass::Quenx_EthernetPortRegisteredProfileClass()
+    : SingletonClass("RegisteredProfile::getInstances", __FILE__, __LINE__) {}

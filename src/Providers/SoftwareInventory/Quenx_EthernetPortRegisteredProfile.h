@@ -1,7 +1,7 @@
 #pragma once
 
+#include "Providers/ClassObjects.h"
 #include "Providers/Schema/CIM_RegisteredProfile.h"
-#include "Providers/SingletonInstanceClass.h"
 
 /// Says that the ports are modelled as DMTF DSP1014 has it. Served as "Quenx_RegisteredProfile", a class that
 /// other providers serve too.
@@ -17,8 +17,7 @@ class Quenx_EthernetPortRegisteredProfile : public CIM_RegisteredProfile {
     virtual void refresh();
 };
 
-class Quenx_EthernetPortRegisteredProfileClass
-    : public SingletonInstanceClass<Quenx_EthernetPortRegisteredProfile> {
+class Quenx_EthernetPortRegisteredProfileClass : public SingletonClass<Quenx_EthernetPortRegisteredProfile> {
   public:
-    Quenx_EthernetPortRegisteredProfileClass() : SingletonInstanceClass("RegisteredProfile::getInstances") {}
+    Quenx_EthernetPortRegisteredProfileClass();
 };

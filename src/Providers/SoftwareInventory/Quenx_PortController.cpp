@@ -4,7 +4,7 @@
 #include <map>
 
 #include "MidAPI/ma.h"
-#include "Providers/SoftwareInventory/Device.h"
+#include "Providers/SoftwareInventory/Devices.h"
 #include "Utils/Debug.h"
 #include "Utils/Log.h"
 #include "Utils/Utils.h"
@@ -48,6 +48,7 @@ void Quenx_PortController::refresh() {
     std::optional<ma::AdapterInfo> info;
     bool updatable = false;
     for (const inventory::Port& port : m_card.ports) {
+        // Every port knows its card; the first that answers will do.
         if (!info) info = inventory::readInfo(port.adapter);
         updatable = updatable || ma::getCanBeUpdated(port.adapter);
     }
@@ -67,20 +68,18 @@ utils::PCIAddr Quenx_PortController::getPCIAddress() const {
     utils::PCIAddr address = m_card.ports.front().address;
     address.function = 0;
     address.noFunction = true;
+    // The text names a port.
     address.text.clear();
     return address;
 }
 
 bool Quenx_PortController::holds(const utils::PCIAddr& address) const {
+    // The functions of one PCI device are the ports of one card.
     return address.sameAdapter(m_card.ports.front().address);
-}
-
-std::string Quenx_PortControllerClass::getClassName() {
-    return Quenx_PortController::classInfo.name;
 }
 
 utils::SafeList<core::CimInstance*>::Iterator Quenx_PortControllerClass::getInstances() {
     QUENX_DEBUG("getInstances");
     const utils::TimeStamp time("Quenx_PortControllerClass::getInstances");
-    return m_controllers.getElements(inventory::groupByCard(inventory::readPorts()));
+    return serve(inventory::groupByCard(inventory::readPorts()));
 }

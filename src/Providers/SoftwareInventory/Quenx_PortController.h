@@ -1,10 +1,9 @@
 #pragma once
 
-#include "Framework/Classes/CimClass.h"
-#include "Providers/InventoryInterfaces.h"
+#include "Providers/ClassObjects.h"
 #include "Providers/Schema/CIM_PortController.h"
-#include "Providers/SoftwareInventory/AdapterReading.h"
-#include "Providers/SoftwareInventory/KeptInstances.h"
+#include "Providers/Schema/InventoryInterfaces.h"
+#include "Providers/SoftwareInventory/Devices.h"
 
 namespace inventory {
 
@@ -42,13 +41,7 @@ class Quenx_PortController : public CIM_PortController, public inventory::PortCo
 };
 
 /// Serves a controller for each card.
-class Quenx_PortControllerClass : public core::CimClass {
+class Quenx_PortControllerClass : public CachedClass<Quenx_PortController, inventory::Card> {
   public:
-    using Instance = Quenx_PortController;
-
-    std::string getClassName() override;
     utils::SafeList<core::CimInstance*>::Iterator getInstances() override;
-
-  private:
-    KeptInstances<Quenx_PortController, inventory::Card> m_controllers;
 };

@@ -9,13 +9,13 @@
 namespace {
 
 /// Values of CIM_SoftwareIdentity.Classifications.
-enum Classification : unsigned short { DRIVER = 2, FIRMWARE = 10, BIOS = 11 };
+enum Classification : std::uint16_t { Driver = 2, Firmware = 10, Bios = 11 };
 
-std::vector<unsigned short> classify(const std::vector<inventory::FirmwareComponent>& components) {
+std::vector<std::uint16_t> classify(const std::vector<inventory::FirmwareComponent>& components) {
     const auto isDriver = [](const inventory::FirmwareComponent& part) { return part.type == "IMG_UEFI"; };
-    std::vector<unsigned short> result{FIRMWARE};
-    if (std::any_of(components.begin(), components.end(), isDriver)) result.push_back(DRIVER);
-    if (!std::all_of(components.begin(), components.end(), isDriver)) result.push_back(BIOS);
+    std::vector<std::uint16_t> result{Firmware};
+    if (std::any_of(components.begin(), components.end(), isDriver)) result.push_back(Driver);
+    if (!std::all_of(components.begin(), components.end(), isDriver)) result.push_back(Bios);
     return result;
 }
 
@@ -60,11 +60,11 @@ void Quenx_SoftwareIdentity::refresh() {
 }
 
 void Quenx_SoftwareIdentity::setKind() {
-    const bool isInstalled = m_firmware.typeCode == INSTALLED_COMPONENT;
+    const bool isInstalled = m_firmware.typeCode == InstalledComponent;
     IsEntity = isInstalled;
     Description = isInstalled ? "Firmware of adapter " + m_firmware.adapter
                               : "Firmware image for PCI device " + m_firmware.ids;
-    OperationalStatus = std::vector<unsigned short>{2};  // OK
+    OperationalStatus = std::vector<std::uint16_t>{2};  // OK
 }
 
 void Quenx_SoftwareIdentity::setVersions() {
@@ -86,7 +86,8 @@ void Quenx_SoftwareIdentity::setVersions() {
     if (m_firmware.components.empty()) {
         MajorVersion.setNull();
     } else {
-        MajorVersion = static_cast<unsigned short>(highest);
+        // Code revisions of images have 16 bits.
+        MajorVersion = static_cast<std::uint16_t>(highest);
     }
 }
 
@@ -108,20 +109,17 @@ utils::StringArray Quenx_SoftwareIdentity::getTargetTypes() const {
 Quenx_SoftwareIdentityClass::Quenx_SoftwareIdentityClass(std::shared_ptr<inventory::FirmwareCatalog> catalog)
     : m_catalog(std::move(catalog)) {}
 
-std::string Quenx_SoftwareIdentityClass::getClassName() {
-    return Quenx_SoftwareIdentity::classInfo.name;
-}
-
 utils::SafeList<core::CimInstance*>::Iterator Quenx_SoftwareIdentityClass::getInstances() {
     QUENX_DEBUG("getInstances");
     const utils::TimeStamp time("Quenx_SoftwareIdentityClass::getInstances");
     std::vector<inventory::Firmware> all;
     std::set<std::string> identifiers;
     for (const auto& file : m_catalog->scan()) {
+        // Equal files are one firmware with several resources.
         if (identifiers.insert(file->firmware.identifier).second) all.push_back(file->firmware);
     }
     for (inventory::Firmware& installed : inventory::readInstalled(inventory::readPorts())) {
         all.push_back(std::move(installed));
     }
-    return m_identities.getElements(all);
+    return serve(all);
 }

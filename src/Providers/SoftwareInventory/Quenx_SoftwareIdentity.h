@@ -1,10 +1,9 @@
 #pragma once
 
-#include "Framework/Classes/CimClass.h"
-#include "Providers/InventoryInterfaces.h"
+#include "Providers/ClassObjects.h"
 #include "Providers/Schema/CIM_SoftwareIdentity.h"
-#include "Providers/SoftwareInventory/FirmwareCatalog.h"
-#include "Providers/SoftwareInventory/KeptInstances.h"
+#include "Providers/Schema/InventoryInterfaces.h"
+#include "Providers/SoftwareInventory/Firmware.h"
 
 /// A firmware: one in a file that can be installed, or one component that an adapter carries.
 ///
@@ -36,15 +35,11 @@ class Quenx_SoftwareIdentity : public CIM_SoftwareIdentity, public inventory::So
 };
 
 /// Serves an identity for each different firmware among the files, then one for each installed component.
-class Quenx_SoftwareIdentityClass : public core::CimClass {
+class Quenx_SoftwareIdentityClass : public CachedClass<Quenx_SoftwareIdentity, inventory::Firmware> {
   public:
-    using Instance = Quenx_SoftwareIdentity;
-
     explicit Quenx_SoftwareIdentityClass(std::shared_ptr<inventory::FirmwareCatalog> catalog);
-    std::string getClassName() override;
     utils::SafeList<core::CimInstance*>::Iterator getInstances() override;
 
   private:
     const std::shared_ptr<inventory::FirmwareCatalog> m_catalog;
-    KeptInstances<Quenx_SoftwareIdentity, inventory::Firmware> m_identities;
 };

@@ -33,10 +33,11 @@ void Quenx_SoftwareIdentityResource::refresh() {
     ResourceType = 4;  // payload
     ElementName = m_file.path.substr(m_file.path.rfind('/') + 1);
     Description = "File of firmware image " + m_file.firmware.identifier;
+    // With the path, since several files may hold one firmware.
     InstanceID = "Quenx:" + m_file.firmware.identifier + "@" + m_file.path;
-    EnabledState = 2;                                    // enabled
-    RequestedState = 12;                                 // not applicable
-    OperationalStatus = std::vector<unsigned short>{2};  // OK
+    EnabledState = 2;                                   // enabled
+    RequestedState = 12;                                // not applicable
+    OperationalStatus = std::vector<std::uint16_t>{2};  // OK
 }
 
 std::string Quenx_SoftwareIdentityResource::getFirmwareFileID() const {
@@ -51,15 +52,11 @@ Quenx_SoftwareIdentityResourceClass::Quenx_SoftwareIdentityResourceClass(
     std::shared_ptr<inventory::FirmwareCatalog> catalog)
     : m_catalog(std::move(catalog)) {}
 
-std::string Quenx_SoftwareIdentityResourceClass::getClassName() {
-    return Quenx_SoftwareIdentityResource::classInfo.name;
-}
-
 utils::SafeList<core::CimInstance*>::Iterator Quenx_SoftwareIdentityResourceClass::getInstances() {
     QUENX_DEBUG("getInstances");
     const utils::TimeStamp time("Quenx_SoftwareIdentityResourceClass::getInstances");
     std::vector<inventory::FirmwareFile> files;
     for (const auto& file : m_catalog->scan())
         files.push_back(*file);
-    return m_resources.getElements(files);
+    return serve(files);
 }

@@ -1,10 +1,9 @@
 #pragma once
 
-#include "Framework/Classes/CimClass.h"
-#include "Providers/InventoryInterfaces.h"
+#include "Providers/ClassObjects.h"
 #include "Providers/Schema/CIM_SoftwareIdentityResource.h"
-#include "Providers/SoftwareInventory/FirmwareCatalog.h"
-#include "Providers/SoftwareInventory/KeptInstances.h"
+#include "Providers/Schema/InventoryInterfaces.h"
+#include "Providers/SoftwareInventory/Firmware.h"
 
 /// A firmware file in one of the configured directories.
 class Quenx_SoftwareIdentityResource : public CIM_SoftwareIdentityResource,
@@ -28,15 +27,12 @@ class Quenx_SoftwareIdentityResource : public CIM_SoftwareIdentityResource,
 };
 
 /// Serves a resource for each file.
-class Quenx_SoftwareIdentityResourceClass : public core::CimClass {
+class Quenx_SoftwareIdentityResourceClass
+    : public CachedClass<Quenx_SoftwareIdentityResource, inventory::FirmwareFile> {
   public:
-    using Instance = Quenx_SoftwareIdentityResource;
-
     explicit Quenx_SoftwareIdentityResourceClass(std::shared_ptr<inventory::FirmwareCatalog> catalog);
-    std::string getClassName() override;
     utils::SafeList<core::CimInstance*>::Iterator getInstances() override;
 
   private:
     const std::shared_ptr<inventory::FirmwareCatalog> m_catalog;
-    KeptInstances<Quenx_SoftwareIdentityResource, inventory::FirmwareFile> m_resources;
 };

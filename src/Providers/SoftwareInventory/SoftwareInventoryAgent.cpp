@@ -32,6 +32,6 @@ SoftwareInventoryAgent::~SoftwareInventoryAgent() {
 namespace {
 
 // Loading the library is what registers the provider; unloading it takes it away.
-core::SoftwareInventoryAgent agent;
+const core::SoftwareInventoryAgent agent;
 
 }  // namespace

@@ -1,13 +1,16 @@
 #include "Providers/SoftwareUpdate/AdapterClaim.h"
 
-#include "Providers/SoftwareUpdate/Quenx_ConcreteJob.h"
-#include "Providers/SoftwareUpdate/UpdateExceptions.h"
+#include "Providers/SoftwareUpdate/MethodResults.h"
 #include "Utils/Os/Linux/SMASHv2Config.h"
 #include "Utils/Utils.h"
 
-AdapterClaim::AdapterClaim(const std::string& adapterName) : m_adapterName(adapterName) {
+void AdapterClaim::take(std::string adapterName) {
     std::string holder;
-    if (Quenx_ConcreteJob::m_servicedAdapter.compareAndSet(std::string(), adapterName, holder)) return;
+    // One step, so that of two requests that arrive together only one finds the adapter free.
+    if (m_serviced->compareAndSet(std::string(), adapterName, holder)) {
+        m_adapterName = std::move(adapterName);
+        return;
+    }
     if (holder == adapterName) {
         throw ETargetInUse(
             utils::formatStr("Firmware update for %s is currently in progress", adapterName.c_str()));
@@ -15,20 +18,23 @@ AdapterClaim::AdapterClaim(const std::string& adapterName) : m_adapterName(adapt
     throw EJobIsRunning(utils::formatStr("Other job for %s is running at this moment", holder.c_str()));
 }
 
-AdapterClaim::~AdapterClaim() {
-    if (m_taken) releaseClaimIfConfigured(m_adapterName);
-}
-
 void AdapterClaim::release() noexcept {
-    Quenx_ConcreteJob::m_servicedAdapter = std::string();
-    m_taken = false;
+    *m_serviced = std::string();
+    m_adapterName.clear();
 }
 
-void releaseClaimIfConfigured(const std::string& adapterName) noexcept {
+void AdapterClaim::releaseIfConfigured() noexcept {
+    // Once released, another request may have taken the same adapter.
+    if (!m_adapterName.empty()) releaseIfConfigured(*m_serviced, m_adapterName);
+    m_adapterName.clear();
+}
+
+void AdapterClaim::releaseIfConfigured(utils::Atomic<std::string>& serviced,
+                                       const std::string& adapterName) noexcept {
     try {
         if (!utils::AutoSingleton<utils::SMASHv2Config>::getInstance()->getReleaseClaimAfterCheck()) return;
         std::string holder;
-        Quenx_ConcreteJob::m_servicedAdapter.compareAndSet(adapterName, std::string(), holder);
+        serviced.compareAndSet(adapterName, std::string(), holder);
     } catch (...) {
         // The claim stays, as it does without the setting.
     }

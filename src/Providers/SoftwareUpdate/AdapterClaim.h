@@ -1,31 +1,40 @@
 #pragma once
 
 #include <string>
+#include <utility>
 
-/// One request's hold on the one adapter that may be serviced at a time
-/// (Quenx_ConcreteJob::m_servicedAdapter).
+#include "Utils/Os/Linux/Atomic.h"
+
+/// A hold on the one adapter that may be serviced at a time. Verification takes it, the job owns it.
 ///
-/// A refusal releases the claim before it is thrown; an accepted image keeps it, for the job or, after a
-/// check, for nobody. Any other failure leaves it taken: the adapter is then in an unknown state and stays
-/// out of use (intended), unless the configuration asks for its release.
+/// Destroying a claim gives nothing back: an adapter whose check succeeded, or whose update ended in a way
+/// that nobody foresaw, stays out of use until the process ends. Whoever gives an adapter back says so.
 class AdapterClaim {
   public:
-    /// Takes the claim, testing and taking in one step. Throws ETargetInUse when the adapter has it already,
-    /// EJobIsRunning when another one has.
-    explicit AdapterClaim(const std::string& adapterName);
-    ~AdapterClaim();
-    AdapterClaim(const AdapterClaim&) = delete;
-    AdapterClaim& operator=(const AdapterClaim&) = delete;
+    /// Not taken yet.
+    /// @param serviced  the name of the adapter that is serviced, empty when none is; outlives the claim
+    explicit AdapterClaim(utils::Atomic<std::string>& serviced) : m_serviced(&serviced) {}
+    AdapterClaim(AdapterClaim&& other) noexcept
+        : m_serviced(other.m_serviced), m_adapterName(std::exchange(other.m_adapterName, {})) {}
+    AdapterClaim& operator=(AdapterClaim&& other) noexcept {
+        m_serviced = other.m_serviced;
+        m_adapterName = std::exchange(other.m_adapterName, {});
+        return *this;
+    }
+    ~AdapterClaim() = default;
 
+    /// Takes the adapter, testing and taking in one step. Throws ETargetInUse when it is being serviced
+    /// already, EJobIsRunning when another one is.
+    void take(std::string adapterName);
+    /// No adapter is serviced any more, whoever took it.
     void release() noexcept;
-    /// The claim is no longer this object's affair.
-    void leave() noexcept { m_taken = false; }
+    /// Gives back what was taken, where the configuration wants that (ReleaseClaimAfterCheck).
+    void releaseIfConfigured() noexcept;
+    /// The same for whoever has only the adapter's name; nothing happens while another adapter is serviced.
+    static void releaseIfConfigured(utils::Atomic<std::string>& serviced,
+                                    const std::string& adapterName) noexcept;
 
   private:
-    const std::string& m_adapterName;
-    bool m_taken = true;
+    utils::Atomic<std::string>* m_serviced;
+    std::string m_adapterName;  ///< empty while nothing is taken
 };
-
-/// Gives a claim back where the configuration wants it (ReleaseClaimAfterCheck). Nothing happens unless the
-/// adapter is the one claimed. Never throws.
-void releaseClaimIfConfigured(const std::string& adapterName) noexcept;

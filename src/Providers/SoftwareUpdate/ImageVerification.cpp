@@ -1,37 +1,204 @@
-// Whether an image may be installed on an adapter that nobody else services meanwhile: the static half of
-// Quenx_ConcreteJob.
-#include "Providers/SoftwareUpdate/AdapterClaim.h"
-#include "Providers/SoftwareUpdate/ImageExamination.h"
+#include "Providers/SoftwareUpdate/ImageVerification.h"
+
+#include <optional>
+#include <span>
+
+#include "MidAPI/ma.h"
+#include "Providers/SoftwareUpdate/MethodResults.h"
 #include "Providers/SoftwareUpdate/Quenx_ConcreteJob.h"
-#include "Providers/SoftwareUpdate/UpdateExceptions.h"
-#include "Providers/SoftwareUpdate/VerifyJobResult.h"
+#include "Providers/SoftwareUpdate/Quenx_SoftwareInstallationService.h"
+#include "Providers/SoftwareUpdate/Quenx_SoftwareInstallationServiceCapabilities.h"
 #include "Utils/Log.h"
+#include "Utils/Os/Linux/SMASHv2Config.h"
+#include "Utils/Os/Linux/linux.h"
+#include "Utils/Uri.h"
+#include "Utils/Utils.h"
+
+namespace {
+
+using Buffer = std::unique_ptr<std::uint8_t[]>;
+
+/// The index of the name in the table of target types; logs the comparison.
+std::optional<utils::FirmwareType> findTargetType(const std::string& name) {
+    constexpr auto& names = Quenx_SoftwareInstallationServiceCapabilities::TargetTypesDescription;
+    for (std::size_t index = 0; index < names.size(); ++index) {
+        QUENX_DEBUG("index: %d", static_cast<int>(index));
+        QUENX_DEBUG("compare with %s", names[index]);
+        if (name == names[index]) return static_cast<utils::FirmwareType>(index);
+    }
+    return std::nullopt;
+}
+
+/// Appends the types that one value lists. An empty piece is the nameless type 0, and repeated types stay.
+void appendTargetTypes(const std::string& value, std::vector<utils::FirmwareType>& types) {
+    for (const std::string& piece : utils::split(value, InstallOption::kTargetTypeSeparator)) {
+        const std::string name = utils::trim(piece);
+        QUENX_DEBUG("TeargetType: %s", name.c_str());
+        const auto type = findTargetType(name);
+        if (!type) {
+            throw utils::EInvalidParameter(utils::formatStr(
+                "Invalid parameter detected for TargetTypes. %s is not recognized", name.c_str()));
+        }
+        types.push_back(*type);
+        QUENX_DEBUG("added new image type - #%d", static_cast<int>(*type));
+    }
+}
+
+/// What Quenx_ConcreteJob::getTargetTypes() returns, without a word about the claim.
+std::vector<utils::FirmwareType> requestedTypes(const std::vector<std::uint16_t>& options,
+                                                const std::vector<std::string>& values) {
+    std::vector<utils::FirmwareType> types;
+    QUENX_DEBUG("InstallOptions Size: %d", static_cast<int>(options.size()));
+    QUENX_DEBUG("InstallOptionsValues Size: %d", static_cast<int>(values.size()));
+    for (std::size_t i = 0; i < options.size(); ++i) {
+        if (options[i] != InstallOption::TargetTypes) continue;
+        QUENX_DEBUG("InstallOptions contains TargetTypes on %d position", static_cast<int>(i));
+        // Values belong to options by their position, so no other value can stand in.
+        if (i >= values.size()) {
+            QUENX_DEBUG("No TargetTypes detected in values");
+            return types;
+        }
+        QUENX_DEBUG("InstallOptionsValues contains %d elements", static_cast<int>(values.size()));
+        appendTargetTypes(values[i], types);
+        if (types.empty()) {
+            QUENX_DEBUG("Values does not contain any TargetTypes");
+            return types;
+        }
+    }
+    for (const utils::FirmwareType type : types) {
+        // One number for two places, as those who search the log know the line.
+        QUENX_DEBUG("Return result[%d]=%%d", static_cast<int>(type));
+    }
+    if (types.empty()) QUENX_DEBUG("No TargetTypes defined");
+    return types;
+}
+
+/// The local path that the URI names.
+std::string locate(const std::string& uri) {
+    utils::Uri parsed(uri);
+    if (!parsed.IsUriSupported()) throw EInvalidUri(utils::formatStr("URI: %s is invalid", uri.c_str()));
+    if (!parsed.IsUriAccesible()) throw EUriDoesNotExist(utils::formatStr("URI: %s is invalid", uri.c_str()));
+    return parsed.getSourcePath();
+}
+
+/// Reads the whole file that the URI names.
+Buffer readImage(const std::string& uri, const std::string& path, std::uint32_t size) {
+    Buffer source = std::make_unique_for_overwrite<std::uint8_t[]>(size);
+    // The file may have shrunk since it was measured.
+    if (os::readFile(path, std::span(source.get(), size)) != size)
+        throw EImageReadError(utils::formatStr("Image read error: %s (%s)", uri.c_str(), path.c_str()));
+    return source;
+}
+
+[[noreturn]] void refuseWithoutForce(const std::string& uri) {
+    throw EDowngradeDetected(
+        utils::formatStr("Downgrade was detected for %s. Try to use FORCE_INSTALL option.", uri.c_str()));
+}
+
+/// An image with other types than the adapter has needs force, and a configuration that permits downgrades.
+void judgeOtherTypes(bool force, const std::string& uri) {
+    const bool enabled = utils::AutoSingleton<utils::SMASHv2Config>::getInstance()->isDowngradeEnabled();
+    QUENX_DEBUG("DowngradeEnable: %d, ForceInstall: %d", enabled, force);
+    if (!enabled) {
+        throw EDowngradeDetected(
+            "The selected flash image cannot be used because it does not contain the same "
+            "image types. Please select a flash file with matching image types.");
+    }
+    if (!force) refuseWithoutForce(uri);
+}
+
+/// Throws the refusal that the adapter API's status stands for. Only 1 to 6 reject an image: a status that is
+/// not known lets it through, as 0 does.
+void judge(int status, bool force, const std::string& uri, const std::string& adapterName) {
+    switch (status) {
+        case ma::PrepareStatus::InvalidParameter:
+            throw utils::EInvalidParameter(
+                utils::formatStr("Invalid parameter detected for %s", uri.c_str()));
+        case ma::PrepareStatus::ImageNotSupported:
+            throw EAdapterNotSupported(utils::formatStr("Image %s is not supported for adapter %s",
+                                                        uri.c_str(), adapterName.c_str()));
+        case ma::PrepareStatus::ImageIsOlder:
+            if (!force) refuseWithoutForce(uri);
+            return;
+        case ma::PrepareStatus::ImageTypesDiffer:
+            judgeOtherTypes(force, uri);
+            return;
+        case ma::PrepareStatus::ImageNotApplicable:
+            throw ENotApplicableForTarget(utils::formatStr("Not applicable for %s", uri.c_str()));
+        case ma::PrepareStatus::UnspecifiedError:
+            throw utils::EUnspecifiedError(
+                utils::formatStr("Unspecified error occurred for %s", uri.c_str()));
+        default:
+            return;
+    }
+}
+
+}  // namespace
+
+PreparedImage examineImage(const std::string& adapterName, const std::string& uri,
+                           const std::vector<std::uint16_t>& installOptions,
+                           const std::vector<std::string>& installOptionValues) {
+    QUENX_DEBUG("Checking URI : '%s' ", uri.c_str());
+    const std::string path = locate(uri);
+    // Measured once: buffers, reading and preparation must agree on one size, whatever happens to the file.
+    // The adapter API counts in 32 bits.
+    const auto fileSize = static_cast<std::uint32_t>(os::getFileSize(path));
+    const Buffer source = readImage(uri, path, fileSize);
+    PreparedImage image{std::make_unique_for_overwrite<std::uint8_t[]>(fileSize), fileSize,
+                        requestedTypes(installOptions, installOptionValues)};
+
+    QUENX_DEBUG("Start preparing the image");
+    const int status = ma::prepareFlashImage(adapterName, source.get(), fileSize, image.bytes.get(),
+                                             &image.size, image.types);
+    QUENX_DEBUG("Image prepared %d", status);
+    const bool force =
+        Quenx_SoftwareInstallationService::IsValueDefined(InstallOption::ForceInstallation, installOptions);
+    judge(status, force, uri, adapterName);
+    return image;
+}
+
+VerifiedImage verifyImage(const std::string& adapterName, const std::string& uri,
+                          const std::vector<std::uint16_t>& installOptions,
+                          const std::vector<std::string>& installOptionValues) {
+    QUENX_DEBUG("Here");
+    AdapterClaim claim(Quenx_ConcreteJob::m_servicedAdapter);
+    // Before the first look at the image: preparing it may take seconds, and the verdict holds only while
+    // nobody else writes to the adapter.
+    claim.take(adapterName);
+    try {
+        PreparedImage image = examineImage(adapterName, uri, installOptions, installOptionValues);
+        return {std::move(claim), std::move(image)};
+    } catch (const utils::Exception& exception) {
+        // A refusal says that nothing was done to the adapter, so others may have it.
+        if (isRefusal(exception))
+            claim.release();
+        else
+            claim.releaseIfConfigured();
+        throw;
+    } catch (...) {
+        claim.releaseIfConfigured();
+        throw;
+    }
+}
 
 std::vector<utils::FirmwareType> Quenx_ConcreteJob::getTargetTypes(
-    std::vector<unsigned short>& installOptions, std::vector<std::string>& installOptionValues) {
+    std::vector<std::uint16_t>& installOptions, std::vector<std::string>& installOptionValues) {
     try {
         return requestedTypes(installOptions, installOptionValues);
     } catch (const utils::EInvalidParameter&) {
-        m_servicedAdapter = std::string();
+        AdapterClaim(m_servicedAdapter).release();
         throw;
     }
 }
 
 void Quenx_ConcreteJob::checkAndVerifyImage(std::string adapterName, std::string& uri,
-                                            std::vector<unsigned short>& installOptions,
+                                            std::vector<std::uint16_t>& installOptions,
                                             std::vector<std::string>& installOptionValues,
                                             std::unique_ptr<std::uint8_t[]>& image, std::uint32_t& imageSize,
                                             std::vector<utils::FirmwareType>& imageTypes) {
-    QUENX_DEBUG("Here");
-    AdapterClaim claim(adapterName);
-    try {
-        PreparedImage prepared = examineImage(adapterName, uri, installOptions, installOptionValues);
-        image = std::move(prepared.bytes);
-        imageSize = prepared.size;
-        imageTypes = std::move(prepared.types);
-    } catch (const utils::Exception& failure) {
-        if (isRefusal(failure)) claim.release();
-        throw;
-    }
-    claim.leave();
+    // The claim object goes and the adapter stays claimed: the caller answers for it.
+    PreparedImage prepared = verifyImage(adapterName, uri, installOptions, installOptionValues).image;
+    image = std::move(prepared.bytes);
+    imageSize = prepared.size;
+    imageTypes = std::move(prepared.types);
 }

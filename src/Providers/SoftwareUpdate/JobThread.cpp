@@ -10,9 +10,9 @@
 
 namespace {
 
-constexpr unsigned int kStartPause = 10;       // ms
-constexpr unsigned int kTerminationPoll = 50;  // ms
-constexpr int kDestructionTimeout = 3000;      // ms
+constexpr std::uint32_t kStartPause = 10;       // ms
+constexpr std::uint32_t kTerminationPoll = 50;  // ms
+constexpr int kDestructionTimeout = 3000;       // ms
 constexpr std::uint32_t kTimeoutErrorCode = 4;
 constexpr auto kDefaultBootType = static_cast<ma::BootType>(0);
 
@@ -55,6 +55,7 @@ JobThread::~JobThread() {
 }
 
 void JobThread::start() {
+    // First, so that a thread that the system refuses counts as started, too.
     m_started = true;
     Thread::start();
 }
@@ -65,6 +66,7 @@ void JobThread::stopFwUpdateExecution() {
 
 bool JobThread::terminate(int timeout) {
     stopFwUpdateExecution();
+    // Polled: the worker may be within the adapter API, which nothing interrupts.
     while (m_executed == false && timeout > 0) {
         msleep(kTerminationPoll);
         timeout -= static_cast<int>(kTerminationPoll);
@@ -74,6 +76,7 @@ bool JobThread::terminate(int timeout) {
 
 void JobThread::execute() {
     QUENX_DEBUG("Thread %p starting", static_cast<const void*>(this));
+    // Leaves the processor to the request that started the job, so that its answer is on the way first.
     msleep(kStartPause);
     ++executionCount;
     m_myJob->setJobState(JobStateRunning);
@@ -85,6 +88,7 @@ void JobThread::execute() {
         m_myJob->setLastError(kTimeoutErrorCode, "Timeout Error");
     }
     m_myJob->setJobState(succeeded ? JobStateCompleted : JobStateException);
+    // From here on an enumeration of the jobs may destroy this object; the destructor waits for this thread.
     m_executed = true;
     QUENX_DEBUG("Thread %p finishing", static_cast<const void*>(this));
 }
@@ -100,10 +104,12 @@ bool JobThread::flash() {
     QUENX_DEBUG("Writing FLASH Image");
     const bool written = ma::writeFlashImage(adapterName, m_myJob->getFlashImage(),
                                              m_myJob->getFlashImageSize(), errorCode, errorText);
+    // Also after a success: the adapter API may have something to say about it.
     m_myJob->setLastError(errorCode, errorText);
     if (!written) return false;
 
     QUENX_DEBUG("Updating CapabilityWord");
+    // The word tells the adapter which of its images to run, so it must not name one that was not written.
     const bool updated =
         ma::updateCapabilityWord(adapterName, m_myJob->getImageTypes(), errorCode, errorText);
     m_myJob->setLastError(errorCode, errorText);

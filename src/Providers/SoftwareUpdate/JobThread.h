@@ -16,7 +16,7 @@ class JobThread : public utils::Thread {
   public:
     /// The job outlives the worker. Throws the assertion for a null pointer.
     explicit JobThread(Quenx_ConcreteJob* job);
-    /// Waits for a worker that has been started: 3 seconds politely, then until it ends.
+    /// Waits for a worker that has been started: asks it to stop, and after 3 seconds waits until it ends.
     ~JobThread() override;
 
     void execute() override;
@@ -26,7 +26,7 @@ class JobThread : public utils::Thread {
     void start();
     bool isExecuted() const { return m_executed == true; }
     /// Asks the worker to stop and waits in steps of 50 ms. With a time-out that is a multiple of 50 the
-    /// result is always true, even when the worker is still running (intended).
+    /// result is always true, even when the worker is still running.
     bool terminate(int timeout);
 
     /// Executions begun since the library was loaded.

@@ -1,6 +1,8 @@
 #include "Providers/SoftwareUpdate/MethodResults.h"
 
-#include "Providers/SoftwareUpdate/VerifyJobResult.h"
+#include <algorithm>
+#include <iterator>
+
 #include "Utils/Log.h"
 
 const MethodTraits kCheckSoftwareIdentity{"Quenx_SoftwareInstallationService::CheckSoftwareIdentity",
@@ -31,6 +33,35 @@ const MethodTraits kCheckImage{"Quenx_SoftwareInstallationService::checkImage",
 
 namespace {
 
+template <class T>
+bool is(const utils::Exception& exception) {
+    return dynamic_cast<const T*>(&exception) != nullptr;
+}
+
+struct Handler {
+    bool (*handles)(const utils::Exception&);
+    int code;
+};
+
+constexpr Handler kHandlers[] = {
+    {is<EJobIsRunning>, VerifyJobResult::JobIsRunning},
+    {is<ETargetInUse>, VerifyJobResult::TargetInUse},
+    {is<EInvalidUri>, VerifyJobResult::InvalidUri},
+    {is<EUriDoesNotExist>, VerifyJobResult::UriDoesNotExist},
+    {is<EImageReadError>, VerifyJobResult::ImageReadError},
+    {is<EAdapterNotSupported>, VerifyJobResult::AdapterNotSupported},
+    {is<utils::EInvalidParameter>, VerifyJobResult::InvalidParameter},
+    {is<utils::EUnspecifiedError>, VerifyJobResult::UnspecifiedError},
+    {is<EDowngradeDetected>, VerifyJobResult::DowngradeDetected},
+    {is<ENotApplicableForTarget>, VerifyJobResult::NotApplicableForTarget},
+};
+
+const Handler* handlerOf(const utils::Exception& exception) {
+    const auto* const handler = std::find_if(std::begin(kHandlers), std::end(kHandlers),
+                                             [&](const Handler& each) { return each.handles(exception); });
+    return handler == std::end(kHandlers) ? nullptr : handler;
+}
+
 /// A line of the log is `before`, the target's path, `after`.
 struct Verdict {
     int result;
@@ -39,8 +70,7 @@ struct Verdict {
     const char* after;
 };
 
-// Two lines end in a blank, a job that runs is "unspecified" while a target in use is "in use", and an image
-// that cannot be read is "unspecified" while one that is not there is an invalid parameter: all intended.
+// Clients know these rows as they are, the two lines that end in a blank included.
 constexpr Verdict kVerdicts[] = {
     {VerifyJobResult::AdapterNotSupported, MethodReturn::UnsupportedTargetType,
      "Target is not supported by service for '", "'"},
@@ -59,6 +89,24 @@ constexpr Verdict kVerdicts[] = {
 
 }  // namespace
 
+bool isRefusal(const utils::Exception& exception) {
+    return handlerOf(exception) != nullptr;
+}
+
+int verifyJobResultOfCurrentException() noexcept {
+    try {
+        throw;
+    } catch (const utils::Exception& exception) {
+        const Handler* const handler = handlerOf(exception);
+        if (handler == nullptr) return VerifyJobResult::UnspecifiedError;
+        QUENX_ERROR("Exception: '%s'", exception.what());
+        return handler->code;
+    } catch (...) {
+        // What is not a refusal has logged itself, if it could.
+        return VerifyJobResult::UnspecifiedError;
+    }
+}
+
 unsigned int returnValueOf(const MethodTraits& method, int verifyJobResult, const std::string& target) {
     QUENX_DEBUG("%s returns: %d", method.verification, verifyJobResult);
     if (verifyJobResult == VerifyJobResult::InvalidParameter) {
@@ -70,5 +118,6 @@ unsigned int returnValueOf(const MethodTraits& method, int verifyJobResult, cons
         QUENX_DEBUG("%s%s%s", verdict.before, target.c_str(), verdict.after);
         return verdict.returnValue;
     }
+    // Nothing above matched, so it is a success: registries may have numbers that are not known here.
     return method.createsJob ? MethodReturn::JobStarted : MethodReturn::Completed;
 }

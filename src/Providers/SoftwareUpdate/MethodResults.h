@@ -2,26 +2,97 @@
 
 #include <string>
 
-/// Return values of the extrinsic methods: the DMTF value map of CIM_SoftwareInstallationService, as far as
-/// used.
-namespace MethodReturn {
+#include "Providers/Schema/ValueMaps.h"
+#include "Utils/Exception.h"
 
-inline constexpr unsigned int Completed = 0;
-inline constexpr unsigned int UnspecifiedError = 2;
-inline constexpr unsigned int Failed = 4;
-inline constexpr unsigned int InvalidParameter = 5;
-inline constexpr unsigned int InUse = 6;
-inline constexpr unsigned int JobStarted = 4096;
-inline constexpr unsigned int UnsupportedTargetType = 4097;
-inline constexpr unsigned int DowngradeNotSupported = 4099;
-inline constexpr unsigned int InsufficientMemory = 4100;
-inline constexpr unsigned int NotApplicable = 4106;
-inline constexpr unsigned int CollectionNotSupported = 4108;
+// From a refusal to what the client is told: exception, result of the registry, return value of the method.
 
-}  // namespace MethodReturn
+namespace utils {
 
-/// What tells the three methods and the check in process apart. The differences between the texts are
-/// intended.
+class EInvalidParameter : public Exception {
+  public:
+    explicit EInvalidParameter(std::string message) : Exception("EInvalidParameter:" + message) {}
+};
+
+}  // namespace utils
+
+// The other refusals, beside utils::EUnspecifiedError. Each message is the class's name, a colon and the
+// text, with no blank between; the base puts its own prefix in front and logs the rest.
+
+/// The target adapter is already being updated.
+class ETargetInUse : public utils::Exception {
+  public:
+    explicit ETargetInUse(std::string message) : Exception("ETargetInUse:" + message) {}
+};
+
+/// Another adapter is being updated.
+class EJobIsRunning : public utils::Exception {
+  public:
+    explicit EJobIsRunning(std::string message) : Exception("EJobIsRunning:" + message) {}
+};
+
+class EInvalidUri : public utils::Exception {
+  public:
+    explicit EInvalidUri(std::string message) : Exception("EInvalidUri:" + message) {}
+};
+
+/// The file that the URI names cannot be opened.
+class EUriDoesNotExist : public utils::Exception {
+  public:
+    explicit EUriDoesNotExist(std::string message) : Exception("EUriDoesNotExist:" + message) {}
+};
+
+class EImageReadError : public utils::Exception {
+  public:
+    explicit EImageReadError(std::string message) : Exception("EImageReadError:" + message) {}
+};
+
+/// The image is for another adapter.
+class EAdapterNotSupported : public utils::Exception {
+  public:
+    explicit EAdapterNotSupported(std::string message) : Exception("EAdapterNotSupported:" + message) {}
+};
+
+/// The image is a downgrade that neither the options nor the configuration permit.
+class EDowngradeDetected : public utils::Exception {
+  public:
+    explicit EDowngradeDetected(std::string message) : Exception("EDowngradeDetected:" + message) {}
+};
+
+class ENotApplicableForTarget : public utils::Exception {
+  public:
+    explicit ENotApplicableForTarget(std::string message) : Exception("ENotApplicableForTarget:" + message) {}
+};
+
+/// What the job registry answers a request with. An int and no closed set: whatever is not listed counts as
+/// success.
+struct VerifyJobResult {
+    enum Value : int {
+        Success = 0,
+        InvalidParameter = 1,
+        AdapterNotSupported = 2,
+        DowngradeDetected = 3,
+        UnspecifiedError = 4,
+        NotApplicableForTarget = 5,
+        InvalidUri = 100,
+        UriDoesNotExist = 101,
+        // Nothing produces 102.
+        ImageReadError = 103,
+        JobIsRunning = 104,
+        TargetInUse = 105,
+        JobStartFailed = 106,
+    };
+};
+
+/// Whether the exception is one of the refusals above, and so says something of the request and not of a
+/// failure on the way.
+bool isRefusal(const utils::Exception& exception);
+
+/// The code for the exception that is being handled; a refusal's text goes to the error log on the way.
+/// Call it within a catch block only. Never throws.
+int verifyJobResultOfCurrentException() noexcept;
+
+/// What tells the three methods and the check in process apart.
 struct MethodTraits {
     const char* name;              ///< labels the call in the log
     const char* verification;      ///< "... returns: %d"
@@ -36,5 +107,5 @@ extern const MethodTraits kInstallFromUri;
 extern const MethodTraits kInstallFromSoftwareIdentity;
 extern const MethodTraits kCheckImage;
 
-/// Logs the verification's result and what it means for the target; returns the method's return value.
+/// Logs the registry's result and what it means for the target; returns the method's return value.
 unsigned int returnValueOf(const MethodTraits& method, int verifyJobResult, const std::string& target);

@@ -1,9 +1,8 @@
 #include "Providers/SoftwareUpdate/Quenx_AffectedJobElement.h"
 
 #include "Framework/Classes/CimBroker.h"
-#include "Providers/SoftwareUpdate/AdapterIndex.h"
+#include "Providers/SoftwareUpdate/AssociationEnds.h"
 #include "Providers/SoftwareUpdate/Quenx_ConcreteJob.h"
-#include "Providers/SoftwareUpdate/Rebuild.h"
 #include "Providers/SoftwareUpdate/SoftwareUpdateAgent.h"
 #include "Utils/Debug.h"
 #include "Utils/Log.h"
@@ -11,12 +10,11 @@
 namespace {
 
 void associate(const Quenx_ConcreteJob& job, const CIM_ManagedElement* affected, Rebuild& rebuilt) {
-    auto association = std::make_unique<Quenx_AffectedJobElement>();
-    association->AffectedElement = affected;
-    association->AffectingElement = &job;
-    association->ElementEffects.setNull();
-    association->OtherElementEffectsDescriptions.setNull();
-    rebuilt.add(std::move(association));
+    auto& association = rebuilt.add<Quenx_AffectedJobElement>();
+    association.AffectedElement = affected;
+    association.AffectingElement = &job;
+    association.ElementEffects.setNull();
+    association.OtherElementEffectsDescriptions.setNull();
 }
 
 }  // namespace
@@ -30,10 +28,6 @@ std::string Quenx_AffectedJobElement::getClassName() const {
     return classInfo.name;
 }
 
-std::string Quenx_AffectedJobElementClass::getClassName() {
-    return Quenx_AffectedJobElement::classInfo.name;
-}
-
 utils::SafeList<core::CimInstance*>::Iterator Quenx_AffectedJobElementClass::getInstances() {
     QUENX_DEBUG("getInstances");
     const utils::TimeStamp timing("Quenx_AffectedJobElementClass::getInstances");
@@ -44,9 +38,10 @@ utils::SafeList<core::CimInstance*>::Iterator Quenx_AffectedJobElementClass::get
     for (const core::CimInstance* each : jobs) {
         const auto* job = dynamic_cast<const Quenx_ConcreteJob*>(each);
         const IndexedPort* port = job == nullptr ? nullptr : adapters.findPort(job->getAdapterName());
+        // The adapter may have gone since the job was made.
         if (port == nullptr) continue;
         associate(*job, port->element, rebuilt);
-        for (const CIM_ManagedElement* controller : adapters.controllersOf(*port))
+        for (const CIM_ManagedElement* controller : port->controllers)
             associate(*job, controller, rebuilt);
     }
     rebuilt.publish();

@@ -1,6 +1,6 @@
 #pragma once
 
-#include "Framework/Classes/CimClass.h"
+#include "Providers/ClassObjects.h"
 #include "Providers/Schema/CIM_AffectedJobElement.h"
 
 /// A job updates a port, and so the card that carries it.
@@ -12,14 +12,8 @@ class Quenx_AffectedJobElement : public CIM_AffectedJobElement {
     ~Quenx_AffectedJobElement() override;
 };
 
-/// Rebuilt on every enumeration; the cost is jobs + ports + controllers.
-class Quenx_AffectedJobElementClass : public core::CimClass {
+/// Rebuilt on every enumeration.
+class Quenx_AffectedJobElementClass : public ListedClass<Quenx_AffectedJobElement> {
   public:
-    using Instance = Quenx_AffectedJobElement;
-
-    std::string getClassName() override;
     utils::SafeList<core::CimInstance*>::Iterator getInstances() override;
-
-  private:
-    core::InstanceList m_instances;
 };

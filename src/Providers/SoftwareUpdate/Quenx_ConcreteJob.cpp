@@ -3,7 +3,7 @@
 #include <optional>
 
 #include "MidAPI/ma.h"
-#include "Providers/SoftwareUpdate/AdapterClaim.h"
+#include "Providers/SoftwareUpdate/ImageVerification.h"
 #include "Providers/SoftwareUpdate/JobThread.h"
 #include "Utils/Exception.h"
 #include "Utils/Log.h"
@@ -14,14 +14,17 @@ namespace {
 constexpr unsigned int kStartFailed = 4;
 constexpr unsigned int kUnsupportedState = 5;
 constexpr unsigned int kInvalidStateTransition = 4097;
-constexpr unsigned short kWholePercent = 100;
+constexpr std::uint16_t kWholePercent = 100;
+constexpr std::uint16_t kOperationalStatusOk = 2;
+/// Only reported: nothing removes a job but its client.
+constexpr std::uint64_t kFiveMinutes = 300000000;
 
 bool hasEnded(JobStateVal state) {
     return state == JobStateCompleted || state == JobStateException;
 }
 
-/// Whether a job in this state has given up its adapter; nothing for values that say neither. That Terminated
-/// and Killed count as unfinished is intended.
+/// Whether a job in this state has given up its adapter; nothing for values that say neither. Nothing enters
+/// Terminated or Killed, and they count as unfinished.
 std::optional<bool> isFinished(JobStateVal state) {
     switch (state) {
         case JobStateShuttingDown:
@@ -51,18 +54,23 @@ constinit const core::CimClassInfo Quenx_ConcreteJob::classInfo{
 __attribute__((init_priority(1000))) utils::Atomic<std::string> Quenx_ConcreteJob::m_servicedAdapter;
 
 Quenx_ConcreteJob::Quenx_ConcreteJob(std::string adapterName, int jobId, std::string& uri,
-                                     std::vector<unsigned short>& installOptions,
+                                     std::vector<std::uint16_t>& installOptions,
                                      std::vector<std::string>& installOptionValues)
     : m_adapterName(std::move(adapterName)), m_jobId(jobId) {
+    // For its worker, and so for a flash: no request may be the one that waits.
     setDestructionWaits();
-    checkAndVerifyImage(m_adapterName, uri, installOptions, installOptionValues, m_flashImage,
-                        m_flashImageSize, m_imageTypes);
+    VerifiedImage verified = verifyImage(m_adapterName, uri, installOptions, installOptionValues);
+    m_claim = std::move(verified.claim);
+    m_flashImage = std::move(verified.image.bytes);
+    m_flashImageSize = verified.image.size;
+    m_imageTypes = std::move(verified.image.types);
     try {
         m_myThread = std::make_unique<JobThread>(this);
     } catch (...) {
-        releaseClaimIfConfigured(m_adapterName);
+        m_claim.releaseIfConfigured();
         throw;
     }
+    // What verification took. The end of the job sets it again.
     m_elapsedTime.setInterval(m_startTime);
 }
 
@@ -106,6 +114,7 @@ void Quenx_ConcreteJob::setLastError(std::uint32_t code, std::string text) {
 
 void Quenx_ConcreteJob::setJobState(JobStateVal state) {
     QUENX_DEBUG("%d -> %d", getJobState(), state);
+    // Declared before the lock and so freed after it: an image has megabytes.
     std::unique_ptr<std::uint8_t[]> released;
     const utils::Mutex::AutoLocker lock(m_stateMutex);
     m_jobState = state;
@@ -116,11 +125,12 @@ void Quenx_ConcreteJob::setJobState(JobStateVal state) {
     if (!m_finished) return;
     released.swap(m_flashImage);
     m_flashImageSize = 0;
-    m_servicedAdapter = std::string();
+    m_claim.release();
 }
 
 bool Quenx_ConcreteJob::claimStart() {
     const utils::Mutex::AutoLocker lock(m_stateMutex);
+    // The state changes a moment later, so a flag of its own keeps two requests from starting two workers.
     if (m_jobState != JobStateNew) return false;
     return !std::exchange(m_startClaimed, true);
 }
@@ -142,9 +152,9 @@ unsigned int Quenx_ConcreteJob::requestStateChange(RequestedState state, utils::
     return kStartFailed;
 }
 
-unsigned short Quenx_ConcreteJob::getPercentComplete() {
+std::uint16_t Quenx_ConcreteJob::getPercentComplete() {
     const JobStateVal state = getJobState();
-    std::optional<unsigned short> percent;
+    std::optional<std::uint16_t> percent;
     if (state == JobStateRunning) {
         try {
             percent = ma::getFlashImageUpdateProgress(m_adapterName);
@@ -156,7 +166,7 @@ unsigned short Quenx_ConcreteJob::getPercentComplete() {
     // The worker may have ended the job while the progress was asked for.
     if (hasEnded(m_jobState)) percent = kWholePercent;
     if (percent) m_percentComplete = *percent;
-    return static_cast<unsigned short>(m_percentComplete);
+    return static_cast<std::uint16_t>(m_percentComplete);
 }
 
 bool Quenx_ConcreteJob::threadControl(ThreadOperationCommand command, int timeout) {
@@ -167,6 +177,7 @@ bool Quenx_ConcreteJob::threadControl(ThreadOperationCommand command, int timeou
         try {
             m_myThread->start();
         } catch (...) {
+            // The exception has logged its reason.
             QUENX_ERROR("Thread start error");
             return false;
         }
@@ -184,4 +195,43 @@ bool Quenx_ConcreteJob::threadControl(ThreadOperationCommand command, int timeou
     }
     QUENX_DEBUG("threadControl %d - DONE", command);
     return disposing;
+}
+
+void Quenx_ConcreteJob::refresh() {
+    // Asked first: the adapter API may be slow, and nothing slow runs under the property lock.
+    const std::uint16_t percentComplete = getPercentComplete();
+
+    const core::RecursiveLocker properties(getMutex());
+    Caption = fmt("Firmware Update Job %d", m_jobId);
+    Description = Caption;
+    setUnknownProperties();
+    OperationalStatus.clear();
+    OperationalStatus.push_back(kOperationalStatusOk);
+    StartTime = m_startTime;
+    JobRunTimes = 1;
+    Priority = 0;
+    DeleteOnCompletion = false;
+    InstanceID = fmt("Quenx:%s", getUniqId().c_str());
+    Name = Caption;
+    TimeBeforeRemoval = utils::Time(kFiveMinutes);
+
+    // One copy of what the worker writes, so that state, times and error belong together.
+    const utils::Mutex::AutoLocker lock(m_stateMutex);
+    PercentComplete = hasEnded(m_jobState) ? kWholePercent : percentComplete;
+    ElapsedTime = m_elapsedTime;
+    ErrorCode = static_cast<std::uint16_t>(m_lastErrorCode);  // as wide as the property
+    ErrorDescription = m_lastErrorText;
+    JobState = static_cast<std::uint16_t>(m_jobState);
+    TimeOfLastStateChange = m_timeOfLastStateChange;
+}
+
+void Quenx_ConcreteJob::setUnknownProperties() {
+    for (core::CimProperty* property : std::initializer_list<core::CimProperty*>{
+             &ElementName,  &Generation,       &InstallDate,        &StatusDescriptions, &Status,
+             &HealthState,  &PrimaryStatus,    &DetailedStatus,     &OperatingStatus,    &CommunicationStatus,
+             &JobStatus,    &TimeSubmitted,    &ScheduledStartTime, &RunMonth,           &RunDay,
+             &RunDayOfWeek, &RunStartInterval, &LocalOrUtcTime,     &UntilTime,          &Notify,
+             &Owner,        &RecoveryAction,   &OtherRecoveryAction}) {
+        property->setNull();
+    }
 }

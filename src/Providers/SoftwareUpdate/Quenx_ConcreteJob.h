@@ -6,6 +6,8 @@
 #include <vector>
 
 #include "Providers/Schema/CIM_ConcreteJob.h"
+#include "Providers/Schema/ValueMaps.h"
+#include "Providers/SoftwareUpdate/AdapterClaim.h"
 #include "Utils/FirmwareTypes.h"
 #include "Utils/Os/Linux/Thread.h"
 #include "Utils/ThreadAnnotations.h"
@@ -13,24 +15,8 @@
 
 class JobThread;
 
-/// The values of CIM_ConcreteJob.JobState (DSP1103). The states from Suspended on that are not marked are
-/// never entered by this provider.
-enum JobStateVal : unsigned short {
-    JobStateNew = 2,
-    JobStateStarting = 3,
-    JobStateRunning = 4,
-    JobStateSuspended = 5,
-    JobStateShuttingDown = 6,
-    JobStateCompleted = 7,  ///< the worker succeeded
-    JobStateTerminated = 8,
-    JobStateKilled = 9,
-    JobStateException = 10,  ///< the worker failed, or could not be started
-    JobStateService = 11,
-    JobStateQueryPending = 12,
-};
-
 /// The requested states of jobs; only Start is accepted.
-enum RequestedState : unsigned short { RequestedStateStart = 2 };
+enum RequestedState : std::uint16_t { RequestedStateStart = 2 };
 
 enum ThreadOperationCommand : int {
     ThreadStart = 1,
@@ -43,14 +29,13 @@ class Quenx_ConcreteJob : public CIM_ConcreteJob {
   public:
     static const core::CimClassInfo classInfo;
 
-    /// The adapter that is being serviced; empty when none is. Taken by image verification, given back by the
-    /// job that ends.
+    /// The adapter that is being serviced; empty when none is. AdapterClaim alone writes it.
     static utils::Atomic<std::string> m_servicedAdapter;
 
-    /// Verifies the image and claims the adapter; throws what checkAndVerifyImage() throws. Creates the
-    /// worker but does not start it.
+    /// Verifies the image and claims the adapter; throws what verifyImage() throws. Creates the worker but
+    /// does not start it.
     Quenx_ConcreteJob(std::string adapterName, int jobId, std::string& uri,
-                      std::vector<unsigned short>& installOptions,
+                      std::vector<std::uint16_t>& installOptions,
                       std::vector<std::string>& installOptionValues);
 
     std::string getClassName() const override;
@@ -80,19 +65,18 @@ class Quenx_ConcreteJob : public CIM_ConcreteJob {
     /// 0 accepted, 4 the worker could not be started, 5 no such request, 4097 the job is not New. The
     /// time-out is accepted and ignored.
     unsigned int requestStateChange(RequestedState state, utils::Time timeout);
-    /// 100 for a job that has ended, well or not (intended).
-    unsigned short getPercentComplete();
+    /// 100 for a job that has ended, well or not.
+    std::uint16_t getPercentComplete();
 
-    /// The image types that the options ask for. Throws utils::EInvalidParameter, with the claim released,
-    /// for a type that is not known.
-    static std::vector<utils::FirmwareType> getTargetTypes(std::vector<unsigned short>& installOptions,
+    /// The image types that the options ask for. For a type that is not known it gives the serviced adapter
+    /// back, whoever claimed it, and throws utils::EInvalidParameter.
+    static std::vector<utils::FirmwareType> getTargetTypes(std::vector<std::uint16_t>& installOptions,
                                                            std::vector<std::string>& installOptionValues);
-    /// Claims the adapter, reads the image, lets the adapter API prepare it and judges the answer. Throws the
-    /// refusals of UpdateExceptions.h; see AdapterClaim for what becomes of the claim.
-    /// @param image,imageSize,imageTypes  set on success: the prepared image, its length, the types to
-    /// install
+    /// verifyImage() for callers that keep the claim to themselves: the adapter stays claimed, and setting
+    /// m_servicedAdapter gives it back.
+    /// @param image,imageSize,imageTypes  set on success
     static void checkAndVerifyImage(std::string adapterName, std::string& uri,
-                                    std::vector<unsigned short>& installOptions,
+                                    std::vector<std::uint16_t>& installOptions,
                                     std::vector<std::string>& installOptionValues,
                                     std::unique_ptr<std::uint8_t[]>& image, std::uint32_t& imageSize,
                                     std::vector<utils::FirmwareType>& imageTypes);
@@ -113,6 +97,7 @@ class Quenx_ConcreteJob : public CIM_ConcreteJob {
     JobStateVal m_jobState QUENX_GUARDED_BY(m_stateMutex) = JobStateNew;
     bool m_startClaimed QUENX_GUARDED_BY(m_stateMutex) = false;
     bool m_finished QUENX_GUARDED_BY(m_stateMutex) = false;
+    AdapterClaim m_claim QUENX_GUARDED_BY(m_stateMutex){m_servicedAdapter};
     utils::Mutex m_jobMutex;  ///< one thread operation at a time
     utils::Time m_timeOfLastStateChange QUENX_GUARDED_BY(m_stateMutex){0ULL};
     std::uint32_t m_lastErrorCode QUENX_GUARDED_BY(m_stateMutex) = 0;

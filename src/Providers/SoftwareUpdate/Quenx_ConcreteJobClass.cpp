@@ -3,34 +3,20 @@
 #include "Framework/Classes/CimBroker.h"
 #include "Framework/Classes/InstanceList.h"
 #include "Framework/Classes/RequestScope.h"
-#include "Providers/SoftwareUpdate/AdapterClaim.h"
-#include "Providers/SoftwareUpdate/VerifyJobResult.h"
+#include "Providers/SoftwareUpdate/ImageVerification.h"
+#include "Providers/SoftwareUpdate/MethodResults.h"
 #include "Utils/Debug.h"
 #include "Utils/Log.h"
 
 namespace {
 
-constexpr unsigned int kStartTimeout = 100;  // seconds
-
-void verifyImage(const std::string& adapterName, std::string& uri,
-                 std::vector<unsigned short>& installOptions, std::vector<std::string>& installOptionValues) {
-    std::unique_ptr<std::uint8_t[]> image;
-    std::uint32_t imageSize = 0;
-    std::vector<utils::FirmwareType> imageTypes;
-    Quenx_ConcreteJob::checkAndVerifyImage(adapterName, uri, installOptions, installOptionValues, image,
-                                           imageSize, imageTypes);
-    releaseClaimIfConfigured(adapterName);
-}
+constexpr std::uint32_t kStartTimeout = 100;  // seconds
 
 }  // namespace
 
 Quenx_ConcreteJobClass::Quenx_ConcreteJobClass() : m_factory(this) {}
 
 Quenx_ConcreteJobClass::~Quenx_ConcreteJobClass() = default;
-
-std::string Quenx_ConcreteJobClass::getClassName() {
-    return Quenx_ConcreteJob::classInfo.name;
-}
 
 utils::SafeList<core::CimInstance*>::Iterator Quenx_ConcreteJobClass::getInstances() {
     const utils::TimeStamp timing("ConcreteJob::getInstances");
@@ -40,6 +26,7 @@ utils::SafeList<core::CimInstance*>::Iterator Quenx_ConcreteJobClass::getInstanc
         auto* job = static_cast<Quenx_ConcreteJob*>(each);
         QUENX_DEBUG("Refreshing job: %s", job->getUniqId().c_str());
         try {
+            // A worker cannot destroy itself, so it is kept until somebody looks at the jobs.
             job->threadControl(ThreadDispose, 0);
         } catch (...) {
             QUENX_DEBUG("Exception happened");
@@ -51,7 +38,7 @@ utils::SafeList<core::CimInstance*>::Iterator Quenx_ConcreteJobClass::getInstanc
 }
 
 int Quenx_ConcreteJobClass::verifyOrCreateNewJob(std::string adapterName, std::string uri,
-                                                 std::vector<unsigned short>& installOptions,
+                                                 std::vector<std::uint16_t>& installOptions,
                                                  std::vector<std::string>& installOptionValues,
                                                  Quenx_ConcreteJob*& job, bool create) {
     const utils::TimeStamp timing("Quenx_ConcreteJobClass::createNewJob");
@@ -59,7 +46,7 @@ int Quenx_ConcreteJobClass::verifyOrCreateNewJob(std::string adapterName, std::s
     job = nullptr;
     try {
         if (create) return createJob(adapterName, uri, installOptions, installOptionValues, job);
-        verifyImage(adapterName, uri, installOptions, installOptionValues);
+        verifyImage(adapterName, uri, installOptions, installOptionValues).claim.releaseIfConfigured();
         return VerifyJobResult::Success;
     } catch (...) {
         return verifyJobResultOfCurrentException();
@@ -67,15 +54,16 @@ int Quenx_ConcreteJobClass::verifyOrCreateNewJob(std::string adapterName, std::s
 }
 
 int Quenx_ConcreteJobClass::createJob(const std::string& adapterName, std::string& uri,
-                                      std::vector<unsigned short>& installOptions,
+                                      std::vector<std::uint16_t>& installOptions,
                                       std::vector<std::string>& installOptionValues,
                                       Quenx_ConcreteJob*& job) {
-    // Taken even if no job comes of it, so ids can have gaps (intended).
+    // Taken even if no job comes of it, so ids can have gaps.
     const std::int32_t id = m_nextJobId++;
     QUENX_DEBUG("Creating new job for %s with id #%d", adapterName.c_str(), id);
     auto* created = new Quenx_ConcreteJob(adapterName, id, uri, installOptions, installOptionValues);
     bool listed = false;
     try {
+        // Listed before it starts: whoever hears of its end must find it.
         m_instances.add(created);
         listed = true;
         created->refresh();
@@ -87,7 +75,8 @@ int Quenx_ConcreteJobClass::createJob(const std::string& adapterName, std::strin
         }
     } catch (...) {
         if (listed) m_instances.remove(created);
-        releaseClaimIfConfigured(adapterName);
+        // Where listing it failed, the job has gone already, and only the name is left.
+        AdapterClaim::releaseIfConfigured(Quenx_ConcreteJob::m_servicedAdapter, adapterName);
         throw;
     }
     // Its destruction waits for a thread that never ran, so it is left to the list's release.
@@ -107,12 +96,13 @@ int Quenx_ConcreteJobClass::DeleteInstance(core::CimPath& path) {
         // The same as a path that names nothing.
     }
     if (job == nullptr) {
-        // The misspelt class name is intended, and so is the last place, for which there is no value.
+        // Word for word what those who watch the log look for; the last place never had a value.
         QUENX_ERROR("Quenx_ConcreteJobe_Provider.DeleteInstance: instance not found '%s' (%%s)",
                     path.toString().c_str());
         return core::kDeleteNotFound;
     }
     QUENX_DEBUG("Removing job: %s", job->getUniqId().c_str());
+    // The job is not stopped: a flash that breaks off leaves a card without firmware.
     job->setDeleted(true);
     return 0;
 }

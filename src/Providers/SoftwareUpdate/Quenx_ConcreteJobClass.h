@@ -4,19 +4,31 @@
 #include <string>
 #include <vector>
 
-#include "Framework/Classes/CimClass.h"
-#include "Providers/SoftwareUpdate/ConcreteJobFactory.h"
+#include "Providers/ClassObjects.h"
 #include "Providers/SoftwareUpdate/Quenx_ConcreteJob.h"
+#include "Utils/Singleton.h"
+
+/// How the installation methods reach the job registry. The registry owns its factory; constructing it makes
+/// it the current one.
+class ConcreteJobFactory : public utils::Singleton<ConcreteJobFactory> {
+  public:
+    explicit ConcreteJobFactory(core::CimClass* cimClass) : m_cimClass(cimClass) {}
+
+    /// The registry; not owned.
+    core::CimClass* getCimClass() const { return m_cimClass; }
+
+    static const char* GetSingletonName() { return "ConcreteJobFactory"; }
+
+  private:
+    core::CimClass* m_cimClass;
+};
 
 /// The registry of all jobs. Jobs stay listed until a client deletes them; ids start at 1 with every load of
 /// the library. Thread-safe.
-class Quenx_ConcreteJobClass : public core::CimClass {
+class Quenx_ConcreteJobClass : public ListedClass<Quenx_ConcreteJob> {
   public:
-    using Instance = Quenx_ConcreteJob;
-
     Quenx_ConcreteJobClass();
 
-    std::string getClassName() override;
     /// Refreshes every job, and disposes of workers that have finished.
     utils::SafeList<core::CimInstance*>::Iterator getInstances() override;
     ~Quenx_ConcreteJobClass() override;
@@ -24,10 +36,10 @@ class Quenx_ConcreteJobClass : public core::CimClass {
     /// Verifies an image for an adapter, and with `create` makes a job of it and starts it. Never throws for
     /// a refusal: returns a VerifyJobResult code.
     /// @param job  set with `create` and code 0 only, else null; stays owned by the registry
-    /// A successful check without `create` leaves the adapter claimed (intended): no update can start until
-    /// the process ends, unless the configuration says ReleaseClaimAfterCheck.
+    /// A successful check without `create` leaves the adapter claimed: no update can start until the process
+    /// ends, unless the configuration says ReleaseClaimAfterCheck.
     virtual int verifyOrCreateNewJob(std::string adapterName, std::string uri,
-                                     std::vector<unsigned short>& installOptions,
+                                     std::vector<std::uint16_t>& installOptions,
                                      std::vector<std::string>& installOptionValues, Quenx_ConcreteJob*& job,
                                      bool create);
 
@@ -40,10 +52,9 @@ class Quenx_ConcreteJobClass : public core::CimClass {
 
   private:
     int createJob(const std::string& adapterName, std::string& uri,
-                  std::vector<unsigned short>& installOptions, std::vector<std::string>& installOptionValues,
+                  std::vector<std::uint16_t>& installOptions, std::vector<std::string>& installOptionValues,
                   Quenx_ConcreteJob*& job);
 
-    core::InstanceList m_instances;
     std::atomic<std::int32_t> m_nextJobId{1};
     ConcreteJobFactory m_factory;
 };

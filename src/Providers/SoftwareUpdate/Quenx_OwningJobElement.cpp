@@ -3,8 +3,7 @@
 #include "Framework/Classes/CimBroker.h"
 #include "Providers/Schema/CIM_Job.h"
 #include "Providers/Schema/CIM_ManagedElement.h"
-#include "Providers/SoftwareUpdate/Rebuild.h"
-#include "Providers/SoftwareUpdate/ServiceLookup.h"
+#include "Providers/SoftwareUpdate/AssociationEnds.h"
 #include "Providers/SoftwareUpdate/SoftwareUpdateAgent.h"
 #include "Utils/Debug.h"
 #include "Utils/Log.h"
@@ -18,10 +17,6 @@ std::string Quenx_OwningJobElement::getClassName() const {
     return classInfo.name;
 }
 
-std::string Quenx_OwningJobElementClass::getClassName() {
-    return Quenx_OwningJobElement::classInfo.name;
-}
-
 utils::SafeList<core::CimInstance*>::Iterator Quenx_OwningJobElementClass::getInstances() {
     QUENX_DEBUG("getInstances");
     const utils::TimeStamp timing("Quenx_OwningJobElementClass::getInstances");
@@ -31,10 +26,9 @@ utils::SafeList<core::CimInstance*>::Iterator Quenx_OwningJobElementClass::getIn
         "Quenx_ConcreteJob", core::SoftwareUpdateAgent::CIM_PROVIDER_NAME));
     const auto* owner = dynamic_cast<const CIM_ManagedElement*>(onlyService(services));
     for (const core::CimInstance* job : jobs) {
-        auto association = std::make_unique<Quenx_OwningJobElement>();
-        association->OwningElement = owner;
-        association->OwnedElement = dynamic_cast<const CIM_Job*>(job);
-        rebuilt.add(std::move(association));
+        auto& association = rebuilt.add<Quenx_OwningJobElement>();
+        association.OwningElement = owner;
+        association.OwnedElement = dynamic_cast<const CIM_Job*>(job);
     }
     rebuilt.publish();
     return m_instances.getElements(false);

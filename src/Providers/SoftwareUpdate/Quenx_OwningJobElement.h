@@ -1,6 +1,6 @@
 #pragma once
 
-#include "Framework/Classes/CimClass.h"
+#include "Providers/ClassObjects.h"
 #include "Providers/Schema/CIM_OwningJobElement.h"
 
 /// The service owns a job.
@@ -13,13 +13,7 @@ class Quenx_OwningJobElement : public CIM_OwningJobElement {
 };
 
 /// Rebuilt on every enumeration. Throws the assertion unless there is one service.
-class Quenx_OwningJobElementClass : public core::CimClass {
+class Quenx_OwningJobElementClass : public ListedClass<Quenx_OwningJobElement> {
   public:
-    using Instance = Quenx_OwningJobElement;
-
-    std::string getClassName() override;
     utils::SafeList<core::CimInstance*>::Iterator getInstances() override;
-
-  private:
-    core::InstanceList m_instances;
 };

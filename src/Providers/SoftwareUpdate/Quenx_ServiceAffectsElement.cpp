@@ -5,23 +5,20 @@
 #include "Framework/Classes/CimBroker.h"
 #include "MidAPI/ma.h"
 #include "Providers/Schema/CIM_Service.h"
-#include "Providers/SoftwareUpdate/AdapterIndex.h"
+#include "Providers/SoftwareUpdate/AssociationEnds.h"
 #include "Providers/SoftwareUpdate/Quenx_SoftwareInstallationServiceCapabilities.h"
-#include "Providers/SoftwareUpdate/Rebuild.h"
-#include "Providers/SoftwareUpdate/ServiceLookup.h"
 #include "Utils/Debug.h"
 #include "Utils/Log.h"
 
 namespace {
 
 void associate(const CIM_Service* service, const CIM_ManagedElement* affected, Rebuild& rebuilt) {
-    auto association = std::make_unique<Quenx_ServiceAffectsElement>();
-    association->AffectedElement = affected;
-    association->AffectingElement = service;
-    association->ElementEffects.setNull();
-    association->OtherElementEffectsDescriptions.setNull();
-    association->AssignedSequence.setNull();
-    rebuilt.add(std::move(association));
+    auto& association = rebuilt.add<Quenx_ServiceAffectsElement>();
+    association.AffectedElement = affected;
+    association.AffectingElement = service;
+    association.ElementEffects.setNull();
+    association.OtherElementEffectsDescriptions.setNull();
+    association.AssignedSequence.setNull();
 }
 
 bool isSupportedType(const std::string& type) {
@@ -31,16 +28,17 @@ bool isSupportedType(const std::string& type) {
 
 /// A firmware image with target types, all of which the service supports.
 bool isInstallable(const inventory::SoftwareIdentity& identity) {
-    if (identity.getTypeCode() != inventory::SoftwareIdentity::FIRMWARE_IMAGE) return false;
+    if (identity.getTypeCode() != inventory::SoftwareIdentity::FirmwareImage) return false;
     const utils::StringArray types = identity.getTargetTypes();
+    // An image with one type that the service does not know would be refused as a whole.
     return !types.empty() && std::all_of(types.begin(), types.end(), isSupportedType);
 }
 
 void associateAdapters(const CIM_Service* service, const AdapterIndex& adapters, Rebuild& rebuilt) {
     for (const IndexedPort& port : adapters.ports()) {
-        const auto controllers = adapters.controllersOf(port);
-        if (controllers.empty() || !ma::getCanBeUpdated(port.adapterName)) continue;
-        for (const CIM_ManagedElement* controller : controllers) {
+        // The adapter API may be slow, so it is asked only about ports whose answer counts.
+        if (port.controllers.empty() || !ma::getCanBeUpdated(port.adapterName)) continue;
+        for (const CIM_ManagedElement* controller : port.controllers) {
             associate(service, port.element, rebuilt);
             associate(service, controller, rebuilt);
         }
@@ -56,10 +54,6 @@ Quenx_ServiceAffectsElement::~Quenx_ServiceAffectsElement() = default;
 
 std::string Quenx_ServiceAffectsElement::getClassName() const {
     return classInfo.name;
-}
-
-std::string Quenx_ServiceAffectsElementClass::getClassName() {
-    return Quenx_ServiceAffectsElement::classInfo.name;
 }
 
 utils::SafeList<core::CimInstance*>::Iterator Quenx_ServiceAffectsElementClass::getInstances() {

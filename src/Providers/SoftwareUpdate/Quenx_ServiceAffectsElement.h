@@ -1,6 +1,6 @@
 #pragma once
 
-#include "Framework/Classes/CimClass.h"
+#include "Providers/ClassObjects.h"
 #include "Providers/Schema/CIM_ServiceAffectsElement.h"
 
 /// The service can update a port, its card, or a firmware image can be installed by it.
@@ -12,16 +12,9 @@ class Quenx_ServiceAffectsElement : public CIM_ServiceAffectsElement {
     ~Quenx_ServiceAffectsElement() override;
 };
 
-/// Rebuilt on every enumeration; the cost is ports + controllers + identities. Throws the assertion unless
-/// there is one service. A card with several ports that can be updated has one association for each
-/// (intended).
-class Quenx_ServiceAffectsElementClass : public core::CimClass {
+/// Rebuilt on every enumeration. Throws the assertion unless there is one service. A card with several ports
+/// that can be updated has one association for each.
+class Quenx_ServiceAffectsElementClass : public ListedClass<Quenx_ServiceAffectsElement> {
   public:
-    using Instance = Quenx_ServiceAffectsElement;
-
-    std::string getClassName() override;
     utils::SafeList<core::CimInstance*>::Iterator getInstances() override;
-
-  private:
-    core::InstanceList m_instances;
 };

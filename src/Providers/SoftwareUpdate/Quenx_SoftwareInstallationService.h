@@ -3,10 +3,9 @@
 #include <string>
 #include <vector>
 
-#include "Framework/Classes/CimClass.h"
+#include "Providers/ClassObjects.h"
 #include "Providers/Schema/CIM_SoftwareInstallationService.h"
-#include "Providers/SingletonInstanceClass.h"
-#include "Providers/UpdateInterfaces.h"
+#include "Providers/Schema/UpdateInterfaces.h"
 
 /// The one software installation service (DSP1025), with its extrinsic methods. The methods return the values
 /// of the DMTF value map; only argument errors, a missing job registry and failed assertions leave them as
@@ -26,22 +25,20 @@ class Quenx_SoftwareInstallationService : public CIM_SoftwareInstallationService
     /// The same for an image that the inventory knows.
     virtual unsigned int InstallFromSoftwareIdentity(core::CimPropertyList& in, core::CimPropertyList& out,
                                                      core::CimInstance*& job);
-    /// Only verifies; 0 on success. No job is created, but the adapter stays claimed (intended).
+    /// Only verifies; 0 on success. No job is created, but the adapter stays claimed.
     virtual unsigned int CheckSoftwareIdentity(core::CimPropertyList& in, core::CimPropertyList& out,
                                                core::CimInstance*& job);
 
     unsigned int checkImage(const std::string& uri, const core::CimPath& target,
-                            const std::vector<unsigned short>& options,
+                            const std::vector<std::uint16_t>& options,
                             const std::vector<std::string>& values) override;
 
     /// "FirmwareUpdate", for every instance.
     static std::string getUniqId() { return "FirmwareUpdate"; }
-    static bool IsValueDefined(unsigned short value, const std::vector<unsigned short>& values);
+    static bool IsValueDefined(std::uint16_t value, const std::vector<std::uint16_t>& values);
 };
 
-class Quenx_SoftwareInstallationServiceClass
-    : public SingletonInstanceClass<Quenx_SoftwareInstallationService> {
+class Quenx_SoftwareInstallationServiceClass : public SingletonClass<Quenx_SoftwareInstallationService> {
   public:
-    Quenx_SoftwareInstallationServiceClass()
-        : SingletonInstanceClass("SoftwareInstallationService::getInstances") {}
+    Quenx_SoftwareInstallationServiceClass();
 };

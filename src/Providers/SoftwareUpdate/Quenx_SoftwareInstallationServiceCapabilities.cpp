@@ -1,17 +1,17 @@
 #include "Providers/SoftwareUpdate/Quenx_SoftwareInstallationServiceCapabilities.h"
 
-#include "Providers/SoftwareUpdate/InstallOptions.h"
+#include "Providers/Schema/ValueMaps.h"
 #include "Providers/SoftwareUpdate/Quenx_SoftwareInstallationService.h"
 #include "Utils/Utils.h"
 
 namespace {
 
 // Values of the DMTF value maps of CIM_SoftwareInstallationServiceCapabilities.
-constexpr unsigned short kInstallFromSoftwareIdentity = 3;
-constexpr unsigned short kInstallFromUri = 5;
-constexpr unsigned short kNoSynchronousAction = 2;
-constexpr unsigned short kNoExtendedResourceType = 2;
-constexpr unsigned short kFileScheme = 3;
+constexpr std::uint16_t kInstallFromSoftwareIdentity = 3;
+constexpr std::uint16_t kInstallFromUri = 5;
+constexpr std::uint16_t kNoSynchronousAction = 2;
+constexpr std::uint16_t kNoExtendedResourceType = 2;
+constexpr std::uint16_t kFileScheme = 3;
 
 }  // namespace
 
@@ -57,3 +57,7 @@ void Quenx_SoftwareInstallationServiceCapabilities::refresh() {
     SupportedExtendedResourceTypesBuildNumbers.setNull();
     SupportedURISchemes = {kFileScheme};
 }
+
+// The label is the service's: the two classes have always been timed under one name.
+Quenx_SoftwareInstallationServiceCapabilitiesClass::Quenx_SoftwareInstallationServiceCapabilitiesClass()
+    : SingletonClass("SoftwareInstallationService::getInstances", __FILE__, __LINE__) {}

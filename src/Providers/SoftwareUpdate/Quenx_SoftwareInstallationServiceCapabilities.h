@@ -3,8 +3,8 @@
 #include <array>
 #include <string>
 
+#include "Providers/ClassObjects.h"
 #include "Providers/Schema/CIM_SoftwareInstallationServiceCapabilities.h"
-#include "Providers/SingletonInstanceClass.h"
 
 /// What the software installation service can do (DSP1025).
 class Quenx_SoftwareInstallationServiceCapabilities : public CIM_SoftwareInstallationServiceCapabilities {
@@ -23,9 +23,7 @@ class Quenx_SoftwareInstallationServiceCapabilities : public CIM_SoftwareInstall
 };
 
 class Quenx_SoftwareInstallationServiceCapabilitiesClass
-    : public SingletonInstanceClass<Quenx_SoftwareInstallationServiceCapabilities> {
+    : public SingletonClass<Quenx_SoftwareInstallationServiceCapabilities> {
   public:
-    // The label is the service's (intended).
-    Quenx_SoftwareInstallationServiceCapabilitiesClass()
-        : SingletonInstanceClass("SoftwareInstallationService::getInstances") {}
+    Quenx_SoftwareInstallationServiceCapabilitiesClass();
 };

@@ -3,7 +3,7 @@
 #include "Framework/Classes/CimBroker.h"
 #include "Providers/Schema/CIM_Capabilities.h"
 #include "Providers/Schema/CIM_ManagedElement.h"
-#include "Providers/SoftwareUpdate/ServiceLookup.h"
+#include "Providers/SoftwareUpdate/AssociationEnds.h"
 #include "Utils/Debug.h"
 #include "Utils/Exception.h"
 #include "Utils/Log.h"
@@ -11,8 +11,8 @@
 namespace {
 
 // Values of the DMTF value map of CIM_ElementCapabilities.Characteristics.
-constexpr unsigned short kDefault = 2;
-constexpr unsigned short kCurrent = 3;
+constexpr std::uint16_t kDefault = 2;
+constexpr std::uint16_t kCurrent = 3;
 
 }  // namespace
 
@@ -25,15 +25,13 @@ std::string Quenx_SoftwareUpdateElementCapabilities::getClassName() const {
     return classInfo.name;
 }
 
-std::string Quenx_SoftwareUpdateElementCapabilitiesClass::getClassName() {
-    return Quenx_SoftwareUpdateElementCapabilities::classInfo.name;
-}
-
 utils::SafeList<core::CimInstance*>::Iterator Quenx_SoftwareUpdateElementCapabilitiesClass::getInstances() {
     QUENX_DEBUG("getInstances");
     const utils::TimeStamp timing("Quenx_SoftwareUpdateElementCapabilitiesClass::getInstances");
+    // Two first calls on two threads make one association.
     const utils::Mutex::AutoLocker lock(m_creation);
     if (m_instances.size() == 0) {
+        // Neither end ever changes, so the association need not either.
         core::InstanceRange services(allServices());
         auto capabilities =
             core::GetCimBroker()->getInstances("Quenx_SoftwareInstallationServiceCapabilities", "");

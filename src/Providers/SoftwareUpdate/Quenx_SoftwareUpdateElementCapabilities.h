@@ -1,6 +1,6 @@
 #pragma once
 
-#include "Framework/Classes/CimClass.h"
+#include "Providers/ClassObjects.h"
 #include "Providers/Schema/CIM_ElementCapabilities.h"
 
 /// The service has its capabilities.
@@ -14,14 +14,11 @@ class Quenx_SoftwareUpdateElementCapabilities : public CIM_ElementCapabilities {
 
 /// Built at the first enumeration and kept. Throws the assertion unless there is one service and one
 /// capabilities instance.
-class Quenx_SoftwareUpdateElementCapabilitiesClass : public core::CimClass {
+class Quenx_SoftwareUpdateElementCapabilitiesClass
+    : public ListedClass<Quenx_SoftwareUpdateElementCapabilities> {
   public:
-    using Instance = Quenx_SoftwareUpdateElementCapabilities;
-
-    std::string getClassName() override;
     utils::SafeList<core::CimInstance*>::Iterator getInstances() override;
 
   private:
-    core::InstanceList m_instances;
     utils::Mutex m_creation;
 };

@@ -3,22 +3,9 @@
 #include "Framework/Classes/CimBroker.h"
 #include "Providers/Schema/CIM_RegisteredProfile.h"
 #include "Providers/Schema/CIM_SoftwareInstallationService.h"
-#include "Providers/SoftwareUpdate/ProfileNames.h"
-#include "Providers/SoftwareUpdate/Rebuild.h"
+#include "Providers/SoftwareUpdate/AssociationEnds.h"
 #include "Utils/Debug.h"
 #include "Utils/Log.h"
-
-namespace {
-
-std::unique_ptr<core::CimInstance> conformanceOf(const CIM_SoftwareInstallationService& service,
-                                                 const CIM_RegisteredProfile& profile) {
-    auto conformance = std::make_unique<Quenx_SoftwareUpdateElementConformsToProfile>();
-    conformance->ConformantStandard = &profile;
-    conformance->ManagedElement = &service;
-    return conformance;
-}
-
-}  // namespace
 
 constinit const core::CimClassInfo Quenx_SoftwareUpdateElementConformsToProfile::classInfo{
     "Quenx_ElementConformsToProfile", &CIM_ElementConformsToProfile::classInfo, true, {}, nullptr};
@@ -27,10 +14,6 @@ Quenx_SoftwareUpdateElementConformsToProfile::~Quenx_SoftwareUpdateElementConfor
 
 std::string Quenx_SoftwareUpdateElementConformsToProfile::getClassName() const {
     return classInfo.name;
-}
-
-std::string Quenx_SoftwareUpdateElementConformsToProfileClass::getClassName() {
-    return Quenx_SoftwareUpdateElementConformsToProfile::classInfo.name;
 }
 
 utils::SafeList<core::CimInstance*>::Iterator
@@ -48,12 +31,15 @@ Quenx_SoftwareUpdateElementConformsToProfileClass::getInstances() {
         if (profile == nullptr) continue;
         const std::string id = profile->InstanceID.get();
         QUENX_DEBUG("['%s']", id.c_str());
-        if (id != ProfileName::SoftwareUpdate) continue;
+        // Every provider registers its profiles under this class.
+        if (id != kSoftwareUpdateProfile) continue;
         for (const core::CimInstance* other : services) {
             const auto* service = dynamic_cast<const CIM_SoftwareInstallationService*>(other);
             if (service == nullptr) continue;
             QUENX_DEBUG("['%s']", service->Name.get().c_str());
-            rebuilt.add(conformanceOf(*service, *profile));
+            auto& conformance = rebuilt.add<Quenx_SoftwareUpdateElementConformsToProfile>();
+            conformance.ConformantStandard = profile;
+            conformance.ManagedElement = service;
         }
     }
     rebuilt.publish();

@@ -1,6 +1,6 @@
 #pragma once
 
-#include "Framework/Classes/CimClass.h"
+#include "Providers/ClassObjects.h"
 #include "Providers/Schema/CIM_ElementConformsToProfile.h"
 
 /// The service conforms to the Software Update profile.
@@ -13,13 +13,8 @@ class Quenx_SoftwareUpdateElementConformsToProfile : public CIM_ElementConformsT
 };
 
 /// Rebuilt on every enumeration.
-class Quenx_SoftwareUpdateElementConformsToProfileClass : public core::CimClass {
+class Quenx_SoftwareUpdateElementConformsToProfileClass
+    : public ListedClass<Quenx_SoftwareUpdateElementConformsToProfile> {
   public:
-    using Instance = Quenx_SoftwareUpdateElementConformsToProfile;
-
-    std::string getClassName() override;
     utils::SafeList<core::CimInstance*>::Iterator getInstances() override;
-
-  private:
-    core::InstanceList m_instances;
 };

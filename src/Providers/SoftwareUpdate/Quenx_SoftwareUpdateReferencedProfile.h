@@ -1,6 +1,6 @@
 #pragma once
 
-#include "Framework/Classes/CimClass.h"
+#include "Providers/ClassObjects.h"
 #include "Providers/Schema/CIM_ReferencedProfile.h"
 
 /// The Ethernet port profile refers to the Software Update profile.
@@ -13,13 +13,7 @@ class Quenx_SoftwareUpdateReferencedProfile : public CIM_ReferencedProfile {
 };
 
 /// Rebuilt on every enumeration; empty where one of the two profiles is not registered.
-class Quenx_SoftwareUpdateReferencedProfileClass : public core::CimClass {
+class Quenx_SoftwareUpdateReferencedProfileClass : public ListedClass<Quenx_SoftwareUpdateReferencedProfile> {
   public:
-    using Instance = Quenx_SoftwareUpdateReferencedProfile;
-
-    std::string getClassName() override;
     utils::SafeList<core::CimInstance*>::Iterator getInstances() override;
-
-  private:
-    core::InstanceList m_instances;
 };

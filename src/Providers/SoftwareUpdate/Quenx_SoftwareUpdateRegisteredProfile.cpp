@@ -1,13 +1,13 @@
 #include "Providers/SoftwareUpdate/Quenx_SoftwareUpdateRegisteredProfile.h"
 
-#include "Providers/SoftwareUpdate/ProfileNames.h"
+#include "Providers/SoftwareUpdate/AssociationEnds.h"
 
 namespace {
 
 // Values of the DMTF value maps of CIM_RegisteredProfile.
-constexpr unsigned short kSpecificationType = 2;
-constexpr unsigned short kOrganizationDmtf = 2;
-constexpr unsigned short kAdvertiseOther = 1;
+constexpr std::uint16_t kSpecificationType = 2;
+constexpr std::uint16_t kOrganizationDmtf = 2;
+constexpr std::uint16_t kAdvertiseOther = 1;
 
 }  // namespace
 
@@ -22,7 +22,7 @@ std::string Quenx_SoftwareUpdateRegisteredProfile::getClassName() const {
 
 void Quenx_SoftwareUpdateRegisteredProfile::refresh() {
     const core::RecursiveLocker lock(getMutex());
-    InstanceID = ProfileName::SoftwareUpdate;
+    InstanceID = kSoftwareUpdateProfile;
     SpecificationType = kSpecificationType;
     RegisteredOrganization = kOrganizationDmtf;
     OtherRegisteredOrganization.setNull();
@@ -34,3 +34,6 @@ void Quenx_SoftwareUpdateRegisteredProfile::refresh() {
     Description = "Software Update Profile for Tarvel(R) Ethernet Adapters";
     ElementName.setNull();
 }
+
+Quenx_SoftwareUpdateRegisteredProfileClass::Quenx_SoftwareUpdateRegisteredProfileClass()
+    : SingletonClass("RegisteredProfile::getInstances", __FILE__, __LINE__) {}

@@ -1,7 +1,7 @@
 #pragma once
 
+#include "Providers/ClassObjects.h"
 #include "Providers/Schema/CIM_RegisteredProfile.h"
-#include "Providers/SingletonInstanceClass.h"
 
 /// Says that this provider implements the DMTF Software Update profile (DSP1025, registered as in DSP1033).
 class Quenx_SoftwareUpdateRegisteredProfile : public CIM_RegisteredProfile {
@@ -16,8 +16,7 @@ class Quenx_SoftwareUpdateRegisteredProfile : public CIM_RegisteredProfile {
 };
 
 class Quenx_SoftwareUpdateRegisteredProfileClass
-    : public SingletonInstanceClass<Quenx_SoftwareUpdateRegisteredProfile> {
+    : public SingletonClass<Quenx_SoftwareUpdateRegisteredProfile> {
   public:
-    Quenx_SoftwareUpdateRegisteredProfileClass()
-        : SingletonInstanceClass("RegisteredProfile::getInstances") {}
+    Quenx_SoftwareUpdateRegisteredProfileClass();
 };

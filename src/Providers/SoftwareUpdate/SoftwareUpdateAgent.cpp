@@ -20,6 +20,7 @@ __attribute__((init_priority(1000))) const std::string SoftwareUpdateAgent::CIM_
 
 SoftwareUpdateAgent::SoftwareUpdateAgent() : CimAgent(CIM_PROVIDER_NAME) {
     GetCimBroker()->addAgent(this);
+    // In the order in which clients have always listed the classes.
     m_classes.add(new Quenx_SoftwareInstallationServiceClass);
     m_classes.add(new Quenx_SoftwareInstallationServiceCapabilitiesClass);
     m_classes.add(new Quenx_SoftwareUpdateRegisteredProfileClass);
@@ -33,6 +34,7 @@ SoftwareUpdateAgent::SoftwareUpdateAgent() : CimAgent(CIM_PROVIDER_NAME) {
 }
 
 SoftwareUpdateAgent::~SoftwareUpdateAgent() {
+    // Here and not in the base: requests in flight still use what this class adds.
     leaveBroker();
 }
 

@@ -27,7 +27,7 @@ class ConcreteJobTest : public test::UpdateTest {
     }
 
     std::string m_uri;
-    std::vector<unsigned short> m_options = {5};
+    std::vector<std::uint16_t> m_options = {5};
     std::vector<std::string> m_values;
 };
 
@@ -115,7 +115,7 @@ TEST_F(ConcreteJobTest, AWorkerThatFlashesIsWaitedForAndNotStopped) {
 
 TEST_F(ConcreteJobTest, ReadsTargetTypesFromTheOptions) {
     struct Row {
-        std::vector<unsigned short> options;
+        std::vector<std::uint16_t> options;
         std::vector<std::string> values;
         std::vector<int> types;
     };
@@ -169,7 +169,7 @@ TEST_F(ConcreteJobTest, TheStatusOfThePreparationDecides) {
         const utils::SMASHv2Config config(
             m_folder.write("policy.conf", row.downgradesBlocked ? "OEMCustomizeable=5\n" : "\n"));
         m_backend->prepareStatus = row.status;
-        m_options = row.force ? std::vector<unsigned short>{5, 3} : std::vector<unsigned short>{5};
+        m_options = row.force ? std::vector<std::uint16_t>{5, 3} : std::vector<std::uint16_t>{5};
         std::string error;
         try {
             makeJob();

@@ -17,7 +17,7 @@ class HookedBackend : public ma::Backend {
   public:
     struct Answer {
         bool succeeds;
-        uint32_t code;
+        std::uint32_t code;
         std::string text;
     };
 
@@ -59,19 +59,20 @@ class HookedBackend : public ma::Backend {
         call("getAdapterFirmwareVersion", adapter);
         return m_next->getAdapterFirmwareVersion(adapter, components);
     }
-    int prepareFlashImage(const std::string& adapter, const uint8_t* file, uint32_t fileSize, uint8_t* output,
-                          uint32_t* imageSize, std::vector<utils::FirmwareType>& types) override {
+    int prepareFlashImage(const std::string& adapter, const std::uint8_t* file, std::uint32_t fileSize,
+                          std::uint8_t* output, std::uint32_t* imageSize,
+                          std::vector<utils::FirmwareType>& types) override {
         call("prepareFlashImage", adapter);
         const int status = m_next->prepareFlashImage(adapter, file, fileSize, output, imageSize, types);
         return prepareStatus.value_or(status);
     }
-    bool writeFlashImage(const std::string& adapter, const uint8_t* image, uint32_t imageSize,
-                         uint32_t& errorCode, std::string& errorText) override {
+    bool writeFlashImage(const std::string& adapter, const std::uint8_t* image, std::uint32_t imageSize,
+                         std::uint32_t& errorCode, std::string& errorText) override {
         call("writeFlashImage", adapter);
         return m_next->writeFlashImage(adapter, image, imageSize, errorCode, errorText);
     }
     bool updateCapabilityWord(const std::string& adapter, const std::vector<utils::FirmwareType>& types,
-                              uint32_t& errorCode, std::string& errorText) override {
+                              std::uint32_t& errorCode, std::string& errorText) override {
         call("updateCapabilityWord", adapter);
         const bool isDone = m_next->updateCapabilityWord(adapter, types, errorCode, errorText);
         if (!capabilityAnswer) return isDone;
@@ -79,7 +80,7 @@ class HookedBackend : public ma::Backend {
         errorText = capabilityAnswer->text;
         return capabilityAnswer->succeeds;
     }
-    uint16_t getFlashImageUpdateProgress(const std::string& adapter) override {
+    std::uint16_t getFlashImageUpdateProgress(const std::string& adapter) override {
         call("getFlashImageUpdateProgress", adapter);
         return m_next->getFlashImageUpdateProgress(adapter);
     }

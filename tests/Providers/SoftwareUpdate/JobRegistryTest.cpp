@@ -3,9 +3,9 @@
 #include <thread>
 
 #include "Framework/Classes/InstanceReaper.h"
+#include "Providers/SoftwareUpdate/MethodResults.h"
 #include "Providers/SoftwareUpdate/Quenx_ConcreteJobClass.h"
 #include "Providers/SoftwareUpdate/UpdateTest.h"
-#include "Providers/SoftwareUpdate/VerifyJobResult.h"
 
 namespace {
 
@@ -19,7 +19,7 @@ class JobRegistryTest : public test::UpdateTest {
     }
 
     int verify(const std::string& adapter) const {
-        std::vector<unsigned short> options = {5};
+        std::vector<std::uint16_t> options = {5};
         std::vector<std::string> values;
         Quenx_ConcreteJob* job = nullptr;
         const int result = registry().verifyOrCreateNewJob(adapter, m_uri, options, values, job, false);
@@ -87,7 +87,7 @@ TEST_F(JobRegistryTest, DeletesJobsAndNothingElse) {
 TEST_F(JobRegistryTest, TheAgentsEndFreesJobsInEveryState) {
     waitForEnd(*install(m_uri, "eth0").job);
     std::string uri = m_uri;
-    std::vector<unsigned short> options = {5};
+    std::vector<std::uint16_t> options = {5};
     std::vector<std::string> values;
     registry().addJob(new Quenx_ConcreteJob("eth0", 77, uri, options, values));
     setClaim("");
@@ -127,8 +127,8 @@ TEST_F(JobRegistryTest, TwoRequestsAtOnceGetOneClaim) {
 /// Stands in for the registry and answers with a given code.
 class AnsweringRegistry : public Quenx_ConcreteJobClass {
   public:
-    int verifyOrCreateNewJob(std::string, std::string, std::vector<unsigned short>&,
-                             std::vector<std::string>&, Quenx_ConcreteJob*&, bool) override {
+    int verifyOrCreateNewJob(std::string, std::string, std::vector<std::uint16_t>&, std::vector<std::string>&,
+                             Quenx_ConcreteJob*&, bool) override {
         if (code == kThrow) throw std::bad_alloc();
         return code;
     }
@@ -141,7 +141,7 @@ TEST_F(JobRegistryTest, RareCodesHaveTheirReturnValueAndLine) {
     const std::string target = port("eth0").toString();
     struct Row {
         int code;
-        unsigned returnValue;
+        std::uint32_t returnValue;
         std::string line;
     };
     for (const Row& row : std::vector<Row>{

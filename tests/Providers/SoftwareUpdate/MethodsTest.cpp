@@ -6,8 +6,8 @@
 #include "Framework/Classes/CimBroker.h"
 #include "Framework/Classes/RequestScope.h"
 #include "MidAPI/Image/RomFormat.h"
+#include "Providers/Schema/UpdateInterfaces.h"
 #include "Providers/SoftwareUpdate/UpdateTest.h"
-#include "Providers/UpdateInterfaces.h"
 #include "Support/TestRoms.h"
 
 namespace {
@@ -17,12 +17,12 @@ using core::CimPath;
 using test::CallResult;
 using test::madeRom;
 using utils::FirmwareType;
-using Codes = std::vector<unsigned short>;
+using Codes = std::vector<std::uint16_t>;
 using Texts = std::vector<std::string>;
 
 constexpr const char* kCheck = "CheckSoftwareIdentity";
-constexpr unsigned kJobStarted = 4096;
-constexpr unsigned kThrows = ~0U;
+constexpr std::uint32_t kJobStarted = 4096;
+constexpr std::uint32_t kThrows = ~0U;
 
 /// A call that is still to be made.
 struct Call {
@@ -74,7 +74,7 @@ class MethodsTest : public test::UpdateTest {
   protected:
     struct Row {
         Call call;
-        unsigned returnValue;
+        std::uint32_t returnValue;
         Texts lines{};          ///< what is logged, or the text of the exception; none when nothing is
         std::string claimed{};  ///< the adapter that was claimed before
     };
@@ -86,7 +86,7 @@ class MethodsTest : public test::UpdateTest {
     CimPath identityOf(const std::string& uri) const;
     CallResult make(const Call& made) const { return call(made.method, made.arguments); }
     /// The return value, with the job ended and the claim given back.
-    unsigned outcome(const Call& made) const {
+    std::uint32_t outcome(const Call& made) const {
         const CallResult result = make(made);
         if (result.job) waitForEnd(*result.job);
         setClaim("");
@@ -272,7 +272,7 @@ TEST_F(MethodsTest, AnswerEachCallWithItsValueLineJobAndClaim) {
 }
 
 /// What the check in process answers to the arguments of InstallFromURI.
-unsigned checkedInProcess(const CimPath& service, const Call& call) {
+std::uint32_t checkedInProcess(const CimPath& service, const Call& call) {
     const core::RequestScope scope;
     CimPath path = service;
     auto* check = dynamic_cast<update::ImageCheck*>(core::GetCimBroker()->getInstanceByPath(path));
@@ -290,7 +290,7 @@ unsigned checkedInProcess(const CimPath& service, const Call& call) {
         for (const core::CimScalar& element : *elements) {
             if (const auto* text = std::get_if<std::string>(&element)) values.push_back(*text);
             if (const auto* code = std::get_if<std::uint64_t>(&element))
-                options.push_back(static_cast<unsigned short>(*code));
+                options.push_back(static_cast<std::uint16_t>(*code));
         }
     }
     return check->checkImage(uri, target, options, values);
@@ -298,7 +298,7 @@ unsigned checkedInProcess(const CimPath& service, const Call& call) {
 
 TEST_F(MethodsTest, TheCheckInProcessAnswersAsTheInstallDoesAndClaimsNothing) {
     setClaim("eth1");  // an update runs, and is not disturbed
-    unsigned checked = 0;
+    std::uint32_t checked = 0;
     for (const std::vector<Row>& rows : {argumentRows(), uriRows(), resolutionRows()}) {
         for (const Row& row : rows) {
             if (row.call.method != "InstallFromURI" || row.returnValue == kThrows) continue;
@@ -353,8 +353,8 @@ TEST_F(MethodsTest, WhatIsAdvertisedWorksAndWhatIsNotIsRefused) {
 
     // Options, each together with 5.
     const std::string options = ", " + text(capabilities, "SupportedInstallOptions") + ",";
-    for (unsigned option = 0; option <= 20; ++option) {
-        const auto code = static_cast<unsigned short>(option == 20 ? 32768 : option);
+    for (std::uint32_t option = 0; option <= 20; ++option) {
+        const auto code = static_cast<std::uint16_t>(option == 20 ? 32768 : option);
         const bool isAdvertised = options.find(" " + std::to_string(code) + ",") != std::string::npos;
         // Unknown codes pass unadvertised.
         const bool passes = isAdvertised || code == 0 || code == 1 || code >= 13;
@@ -370,7 +370,7 @@ TEST_F(MethodsTest, WhatIsAdvertisedWorksAndWhatIsNotIsRefused) {
     // Target types: each is known, though not each is in the image.
     for (const auto& type : *capabilities.find("SupportedTargetTypes")->value.elements()) {
         const std::string name = core::scalarText(core::CimType::String, type);
-        const unsigned expected = name == "IMG_PXE" || name == "IMG_UEFI" ? kJobStarted : 4106;
+        const std::uint32_t expected = name == "IMG_PXE" || name == "IMG_UEFI" ? kJobStarted : 4106;
         EXPECT_EQ(outcome(fromUri(m_uri, m_port, {32768, 5}, {name})), expected) << name;
     }
     EXPECT_EQ(outcome(fromUri(m_uri, m_port, {32768, 5}, {"IMG_OTHER"})), 5U);
@@ -380,7 +380,7 @@ TEST_F(MethodsTest, CheckAndInstallGiveTheSameVerdict) {
     // The write fails, so that the adapter stays as it is for the next image.
     for (const std::string& adapter : m_adapters->enumerateAdapters())
         m_adapters->injectFault(adapter, {ma::Operation::Write, ma::Fault::Action::Fail, 0, 1, "kept"});
-    std::set<unsigned> verdicts;
+    std::set<std::uint32_t> verdicts;
     for (const std::string& uri : {
              m_uri,
              file("old.rom", madeRom({{FirmwareType::PXE, 0}, {FirmwareType::UEFI, 0}})),
@@ -391,7 +391,7 @@ TEST_F(MethodsTest, CheckAndInstallGiveTheSameVerdict) {
          }) {
         const CimPath source = identityOf(uri);
         for (const CimPath& target : m_requests.enumerateInstanceNames("Quenx_EthernetPort")) {
-            const unsigned verdict = outcome(check(source, target));
+            const std::uint32_t verdict = outcome(check(source, target));
             EXPECT_EQ(outcome(fromIdentity(source, target)), verdict == 0 ? kJobStarted : verdict)
                 << uri << " on " << target.toString();
             verdicts.insert(verdict);

@@ -27,7 +27,7 @@ CallResult UpdateClient::call(const std::string& method, const std::vector<Argum
             if (output.name == "Job") result.job = std::get<core::CimPath>(*output.value.scalar());
             if (output.name != "InstallCharacteristics") continue;
             for (const CimScalar& code : *output.value.elements()) {
-                result.characteristics.push_back(static_cast<unsigned short>(std::get<std::uint64_t>(code)));
+                result.characteristics.push_back(static_cast<std::uint16_t>(std::get<std::uint64_t>(code)));
             }
         }
     } catch (const core::CimError& error) {
@@ -37,7 +37,7 @@ CallResult UpdateClient::call(const std::string& method, const std::vector<Argum
 }
 
 CallResult UpdateClient::install(const std::string& uri, const std::string& adapter,
-                                 std::vector<unsigned short> options, std::vector<std::string> values) const {
+                                 std::vector<std::uint16_t> options, std::vector<std::string> values) const {
     return call("InstallFromURI",
                 {textArgument("URI", uri), pathArgument("Target", port(adapter)),
                  codesArgument("InstallOptions", options), textsArgument("InstallOptionsValues", values)});
@@ -60,8 +60,8 @@ bool UpdateClient::hasEnded(const core::InstanceValue& job) {
     return state(job) == 7U || state(job) == 10U;  // completed, or exception
 }
 
-unsigned UpdateClient::number(const core::InstanceValue& instance, const char* property) {
-    return static_cast<unsigned>(std::get<std::uint64_t>(*instance.find(property)->value.scalar()));
+std::uint32_t UpdateClient::number(const core::InstanceValue& instance, const char* property) {
+    return static_cast<std::uint32_t>(std::get<std::uint64_t>(*instance.find(property)->value.scalar()));
 }
 
 std::string UpdateClient::text(const core::InstanceValue& instance, const char* property) {
@@ -94,9 +94,9 @@ Argument textArgument(const char* name, const std::string& text) {
     return {name, CimValue::of(CimType::String, CimScalar(text))};
 }
 
-Argument codesArgument(const char* name, const std::vector<unsigned short>& codes) {
+Argument codesArgument(const char* name, const std::vector<std::uint16_t>& codes) {
     std::vector<CimScalar> values;
-    for (const unsigned short code : codes)
+    for (const std::uint16_t code : codes)
         values.emplace_back(std::uint64_t{code});
     return {name, CimValue::arrayOf(CimType::Uint16, std::move(values))};
 }

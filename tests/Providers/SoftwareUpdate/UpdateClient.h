@@ -15,7 +15,7 @@ struct CallResult {
     unsigned int returnValue = 0;
     std::string error;  ///< the text of the CIM error; the return value means nothing then
     std::optional<core::CimPath> job;
-    std::vector<unsigned short> characteristics;
+    std::vector<std::uint16_t> characteristics;
 };
 
 /// A client of the providers that this process serves: speaks through the request layer only, and so needs
@@ -32,14 +32,14 @@ class UpdateClient {
     CallResult call(const std::string& method, const std::vector<core::Argument>& arguments) const;
     /// InstallFromURI with options, by default {5}, on a port.
     CallResult install(const std::string& uri, const std::string& adapter,
-                       std::vector<unsigned short> options = {5}, std::vector<std::string> values = {}) const;
+                       std::vector<std::uint16_t> options = {5}, std::vector<std::string> values = {}) const;
 
     /// Follows the job to its end; fails the test when it takes too long.
     core::InstanceValue waitForEnd(const core::CimPath& job) const;
 
-    static unsigned state(const core::InstanceValue& job) { return number(job, "JobState"); }
+    static std::uint32_t state(const core::InstanceValue& job) { return number(job, "JobState"); }
     static bool hasEnded(const core::InstanceValue& job);
-    static unsigned number(const core::InstanceValue& instance, const char* property);
+    static std::uint32_t number(const core::InstanceValue& instance, const char* property);
     /// A property as text, an array's elements joined by ", "; empty when it is null or not there.
     static std::string text(const core::InstanceValue& instance, const char* property);
     /// For each instance of the class, the properties' texts, separated by "; ".
@@ -53,7 +53,7 @@ class UpdateClient {
 // Arguments of methods.
 core::Argument pathArgument(const char* name, const core::CimPath& path);
 core::Argument textArgument(const char* name, const std::string& text);
-core::Argument codesArgument(const char* name, const std::vector<unsigned short>& codes);
+core::Argument codesArgument(const char* name, const std::vector<std::uint16_t>& codes);
 core::Argument textsArgument(const char* name, const std::vector<std::string>& texts);
 
 }  // namespace test

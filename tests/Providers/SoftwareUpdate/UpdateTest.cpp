@@ -37,7 +37,7 @@ void UpdateTest::deleteJobs() const {
     core::drainReaper();
 }
 
-std::string UpdateTest::file(const std::string& name, const std::vector<uint8_t>& content) const {
+std::string UpdateTest::file(const std::string& name, const std::vector<std::uint8_t>& content) const {
     return "file://" + m_folder.write(name, std::span(content));
 }
 

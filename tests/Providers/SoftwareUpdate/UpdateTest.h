@@ -32,7 +32,7 @@ class UpdateTest : public ::testing::Test, public UpdateClient {
     void deleteJobs() const;
 
     /// Writes a file and gives its URI.
-    std::string file(const std::string& name, const std::vector<uint8_t>& content) const;
+    std::string file(const std::string& name, const std::vector<std::uint8_t>& content) const;
     /// A small image with the types and revisions of eth0.
     std::string goodImage() const;
 

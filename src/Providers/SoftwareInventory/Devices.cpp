@@ -1,4 +1,4 @@
-#include "Providers/SoftwareInventory/AdapterReading.h"
+#include "Providers/SoftwareInventory/Devices.h"
 
 #include "MidAPI/Image/OptionRom.h"
 #include "MidAPI/ma.h"

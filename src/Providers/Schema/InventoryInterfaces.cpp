@@ -1,4 +1,4 @@
-#include "Providers/InventoryInterfaces.h"
+#include "Providers/Schema/InventoryInterfaces.h"
 
 namespace inventory {
 

@@ -1,13 +1,17 @@
 #pragma once
 
+#include <cstdint>
 #include <optional>
 #include <string>
 #include <vector>
 
 #include "MidAPI/AdapterTypes.h"
 #include "Utils/FirmwareTypes.h"
+#include "Utils/Os/Linux/linux.h"
 
-/// How the inventory reads adapters. One that does not answer never hides the others.
+/// Ports and cards: how they are read, where an adapter that does not answer never hides the others, and what
+/// both say of themselves. Each template is for a binding class that derives from CIM_LogicalDevice, and sets
+/// the members of that class.
 namespace inventory {
 
 /// A port, by what identifies it.
@@ -36,7 +40,7 @@ struct Identification {
 std::vector<Identification> identify(const std::string& address, const std::optional<ma::AdapterInfo>& info,
                                      bool updatable);
 
-/// Puts the rows into the two arrays of a CIM_LogicalDevice.
+/// Puts the rows into the two arrays that stand for them.
 template <class Device>
 void setIdentification(Device& device, std::vector<Identification> rows) {
     std::vector<std::string> infos;
@@ -47,6 +51,31 @@ void setIdentification(Device& device, std::vector<Identification> rows) {
     }
     device.OtherIdentifyingInfo = std::move(infos);
     device.IdentifyingDescriptions = std::move(descriptions);
+}
+
+/// Sets the keys and the names. Called once, so that the path stays what it was when the host gets another
+/// name.
+template <class Device>
+void setDeviceKeys(Device& device, const std::string& uniqId) {
+    device.SystemCreationClassName = "CIM_ComputerSystem";
+    device.SystemName = os::getHostname();
+    device.CreationClassName = device.getClassName();
+    device.DeviceID = "Quenx:" + uniqId;
+    device.Name = uniqId;
+    device.ElementName = uniqId;
+}
+
+/// Values of CIM_EnabledLogicalElement.EnabledState.
+enum class EnabledState : std::uint16_t { Unknown = 0, Enabled = 2, EnabledButOffline = 6 };
+
+/// Sets the states: a device that does not answer is in a state not known.
+template <class Device>
+void setDeviceState(Device& device, EnabledState state) {
+    const bool isKnown = state != EnabledState::Unknown;
+    device.EnabledState = static_cast<std::uint16_t>(state);
+    device.RequestedState = 12;  // not applicable: nobody can enable or disable it here
+    device.OperationalStatus = std::vector<std::uint16_t>{static_cast<std::uint16_t>(isKnown ? 2 : 0)};  // OK
+    device.HealthState = isKnown ? 5 : 0;                                                                // OK
 }
 
 }  // namespace inventory

@@ -14,9 +14,9 @@ using Rows = std::vector<std::string>;
 using utils::FirmwareType;
 
 /// Two firmware directories, and adapters that carry nothing.
-class Firmware : public test::UpdateTest {
+class FirmwareTest : public test::UpdateTest {
   protected:
-    Firmware() {
+    FirmwareTest() {
         fs::create_directory(m_folder / "a");
         fs::create_directory(m_folder / "b");
         m_folder.write("quenx.conf", "FWFilePath=" + (m_folder / "a") + ";" + (m_folder / "b") + "\n");
@@ -34,7 +34,7 @@ class Firmware : public test::UpdateTest {
     const test::SimulatedAdapters m_none{""};
 };
 
-TEST_F(Firmware, OfAFileIsDescribedByTheFile) {
+TEST_F(FirmwareTest, OfAFileIsDescribedByTheFile) {
     m_folder.write("a/efi-virtio.rom", test::realRom("efi-virtio"));
     m_folder.write("b/clp.rom", test::madeRom({{FirmwareType::iSCSI, 7}}, 0x15ad, 0x07b0));
     EXPECT_EQ(table("Quenx_SoftwareIdentity", {"ElementName", "VersionString", "MajorVersion", "TargetTypes",
@@ -49,7 +49,7 @@ TEST_F(Firmware, OfAFileIsDescribedByTheFile) {
               "Quenx:PCI Vendor and Device ID, Quenx:IMG_PXE, Quenx:IMG_UEFI; 1af4:1041, 1, 0");
 }
 
-TEST_F(Firmware, ComesAndGoesWithItsFile) {
+TEST_F(FirmwareTest, ComesAndGoesWithItsFile) {
     m_folder.write("a/one.rom", rom(1));
     EXPECT_EQ(images(), Rows{"1af4:1041 IMG_PXE 1, IMG_UEFI 0"});
     const auto path = m_requests.enumerateInstanceNames("Quenx_SoftwareIdentity").front();
@@ -76,7 +76,7 @@ TEST_F(Firmware, ComesAndGoesWithItsFile) {
     EXPECT_EQ(files(), Rows{});
 }
 
-TEST_F(Firmware, ThatIsBrokenIsSkippedWithOneLine) {
+TEST_F(FirmwareTest, ThatIsBrokenIsSkippedWithOneLine) {
     std::vector<std::uint8_t> cut = rom(1);
     cut.resize(cut.size() - 512);
     m_folder.write("a/cut.rom", cut);
@@ -101,7 +101,7 @@ TEST_F(Firmware, ThatIsBrokenIsSkippedWithOneLine) {
     EXPECT_EQ(files(), (Rows{"cut.rom", "dangling.rom", "good.rom"}));
 }
 
-TEST_F(Firmware, IsReadOnceWhileItsFileDoesNotChange) {
+TEST_F(FirmwareTest, IsReadOnceWhileItsFileDoesNotChange) {
     for (std::uint16_t device = 1; device <= 1000; device++)
         m_folder.write("a/" + std::to_string(device) + ".rom", rom(1, device));
     EXPECT_EQ(images().size(), 1000U);
@@ -112,7 +112,7 @@ TEST_F(Firmware, IsReadOnceWhileItsFileDoesNotChange) {
     EXPECT_EQ(m_log.count("Reading firmware file "), 1001U);
 }
 
-TEST_F(Firmware, ThatIsInstalledBelongsToItsPort) {
+TEST_F(FirmwareTest, ThatIsInstalledBelongsToItsPort) {
     const test::SimulatedAdapters usual;
     Rows found;
     for (const auto& port : m_requests.enumerateInstances("Quenx_EthernetPort")) {

@@ -1,4 +1,4 @@
-#include "Providers/UpdateInterfaces.h"
+#include "Providers/Schema/UpdateInterfaces.h"
 
 namespace update {
 

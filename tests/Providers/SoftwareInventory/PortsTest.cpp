@@ -10,7 +10,7 @@ namespace {
 
 using Rows = std::vector<std::string>;
 
-class Ports : public test::UpdateTest {
+class PortsTest : public test::UpdateTest {
   protected:
     /// The instances of both classes as the broker hands them out.
     static std::vector<core::CimInstance*> objects() {
@@ -28,7 +28,7 @@ class Ports : public test::UpdateTest {
     }
 };
 
-TEST_F(Ports, ShowWhatTheAdapterSaysOfItself) {
+TEST_F(PortsTest, ShowWhatTheAdapterSaysOfItself) {
     EXPECT_EQ(table("Quenx_EthernetPort", {"Name", "PermanentAddress", "NetworkAddresses", "Speed",
                                            "EnabledState", "LinkTechnology", "OperationalStatus"}),
               (Rows{
@@ -60,7 +60,7 @@ TEST_F(Ports, ShowWhatTheAdapterSaysOfItself) {
     EXPECT_FALSE(std::filesystem::exists(m_adapters.stateDirectory())) << "reading must not write";
 }
 
-TEST_F(Ports, StayTheSameObjectsWhileTheAdaptersDo) {
+TEST_F(PortsTest, StayTheSameObjectsWhileTheAdaptersDo) {
     const core::RequestScope scope;
     const auto before = objects();
     std::string changed = test::kTestAdapters;
@@ -80,7 +80,7 @@ TEST_F(Ports, StayTheSameObjectsWhileTheAdaptersDo) {
     EXPECT_EQ(before.front()->getClassName(), "Quenx_EthernetPort");
 }
 
-TEST_F(Ports, ThatDoNotAnswerHideNoOthers) {
+TEST_F(PortsTest, ThatDoNotAnswerHideNoOthers) {
     m_adapters->injectFault("eth0", {.at = ma::Operation::Info});
     m_adapters->injectFault("eth2", {.at = ma::Operation::PciAddress});
     EXPECT_EQ(table("Quenx_EthernetPort", {"Name", "PermanentAddress", "Speed", "EnabledState", "HealthState",

@@ -1,5 +1,6 @@
 #pragma once
 
+#include <cstdint>
 #include <string>
 #include <vector>
 
@@ -21,7 +22,7 @@ class QUENX_EXPORT ImageCheck {
     /// created and no adapter is claimed, now or afterwards, so that an update may run meanwhile. Returns 0
     /// for an image that could be installed, else what InstallFromURI returns. Thread-safe.
     virtual unsigned int checkImage(const std::string& uri, const core::CimPath& target,
-                                    const std::vector<unsigned short>& options,
+                                    const std::vector<std::uint16_t>& options,
                                     const std::vector<std::string>& values) = 0;
 };
 

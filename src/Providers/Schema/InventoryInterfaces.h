@@ -35,8 +35,8 @@ class QUENX_EXPORT SoftwareIdentity {
   public:
     /// What getTypeCode() tells apart.
     enum TypeCode : int {
-        INSTALLED_COMPONENT = 1,  ///< runs on an adapter
-        FIRMWARE_IMAGE = 4,       ///< a file that can be installed
+        InstalledComponent = 1,  ///< runs on an adapter
+        FirmwareImage = 4,       ///< a file that can be installed
     };
 
     virtual ~SoftwareIdentity();

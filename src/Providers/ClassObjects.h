@@ -1,0 +1,130 @@
+// How class objects come by their instances: once, anew at each enumeration, or only when something changed.
+#pragma once
+
+#include <memory>
+#include <string>
+#include <utility>
+#include <vector>
+
+#include "Framework/Classes/CimClass.h"
+#include "Utils/Debug.h"
+#include "Utils/Log.h"
+#include "Utils/Os/Linux/Mutex.h"
+
+/// A class object that serves instances of T from a list of its own.
+template <class T>
+class ListedClass : public core::CimClass {
+  public:
+    using Instance = T;
+
+    std::string getClassName() override { return T::classInfo.name; }
+
+  protected:
+    core::InstanceList m_instances;
+};
+
+/// A class object with one instance, which is made and refreshed at the first enumeration and then kept.
+template <class T>
+class SingletonClass : public ListedClass<T> {
+  public:
+    /// @param label      names the enumeration in the log; several classes may share one
+    /// @param file,line  the place in the class's own unit that the log names: whoever reads a line looks for
+    ///                   the class, not for this template
+    SingletonClass(const char* label, const char* file, int line)
+        : m_label(label), m_file(file), m_line(line) {}
+
+    utils::SafeList<core::CimInstance*>::Iterator getInstances() override {
+        log("getInstance");
+        const utils::TimeStamp timing(m_label);
+        createOnce();
+        utils::formatDebugLog(m_file, kFunction, m_line, "return %d",
+                              static_cast<int>(this->m_instances.size()));
+        return this->m_instances.getElements(false);
+    }
+
+  private:
+    static constexpr const char* kFunction = "getInstances";
+
+    void log(const char* line) const { utils::formatDebugLog(m_file, kFunction, m_line, "%s", line); }
+
+    /// Two first calls on two threads make one instance.
+    void createOnce() {
+        const utils::Mutex::AutoLocker lock(m_creation);
+        if (this->m_instances.size() != 0) return;
+        log("create new instance");
+        auto instance = std::make_unique<T>();
+        instance->refresh();
+        this->m_instances.add(instance.release());
+    }
+
+    utils::Mutex m_creation;
+    const char* m_label;
+    const char* m_file;
+    int m_line;
+};
+
+/// Fills a class object's list anew and publishes it in one step, so that two enumerations at once neither
+/// double nor drop an instance. Where an exception ends it before that, the list is left empty.
+class Rebuild {
+  public:
+    /// The list must outlive the rebuild.
+    explicit Rebuild(core::InstanceList& instances) : m_instances(instances) {}
+    ~Rebuild() {
+        if (!m_isPublished) m_instances.clear();
+    }
+    Rebuild(const Rebuild&) = delete;
+    Rebuild& operator=(const Rebuild&) = delete;
+
+    /// Adds a new instance, for the caller to fill. The list owns it.
+    template <class T>
+    T& add() {
+        auto* instance = new T;
+        m_rebuilt.add(instance);
+        return *instance;
+    }
+    void publish() {
+        m_instances.publish(m_rebuilt);
+        m_isPublished = true;
+    }
+
+  private:
+    core::InstanceList& m_instances;
+    core::InstanceList m_rebuilt;
+    bool m_isPublished = false;
+};
+
+/// A class object with one instance for each key. The instances are kept, and only refreshed, while the keys
+/// stay the same, so that references to them stay good. T is built from a Key and has refresh().
+template <class T, class Key>
+class CachedClass : public ListedClass<T> {
+  protected:
+    /// The instances for these keys, all of them fresh.
+    core::InstanceList::Iterator serve(const std::vector<Key>& keys) {
+        if (!rebuild(keys)) refresh();
+        return this->m_instances.getElements(false);
+    }
+
+  private:
+    /// False when the keys are those of the last time.
+    bool rebuild(const std::vector<Key>& keys) {
+        const utils::Mutex::AutoLocker lock(m_mutex);
+        if (keys == m_keys) return false;
+        core::InstanceList rebuilt;
+        for (const Key& key : keys) {
+            auto instance = std::make_unique<T>(key);
+            instance->refresh();
+            rebuilt.add(instance.release());
+        }
+        m_keys = keys;
+        this->m_instances.publish(rebuilt);
+        return true;
+    }
+
+    void refresh() {
+        for (core::CimInstance* instance : core::InstanceRange(this->m_instances.getElements(false)))
+            static_cast<T*>(instance)->refresh();
+    }
+
+    utils::Mutex m_mutex;
+    std::vector<Key> m_keys QUENX_GUARDED_BY(m_mutex);
+};
