@@ -23,12 +23,13 @@ AdapterIndex::AdapterIndex()
             {dynamic_cast<const CIM_ManagedElement*>(each), port->getAdapterName(), port->getPCIAddress()});
         m_portsByName.emplace(m_ports.back().adapterName, m_ports.size() - 1);
     }
+    // The controllers are the outer loop, so that one is in the cache while the ports pass by: a thousand
+    // ports on their cards are a quarter of a million questions.
     for (const core::CimInstance* each : m_controllerInstances) {
         const auto* controller = dynamic_cast<const inventory::PortController*>(each);
         if (controller == nullptr) continue;
-        const utils::PCIAddr card = controller->getPCIAddress();
         for (IndexedPort& port : m_ports) {
-            if (card.sameAdapter(port.address) && controller->holds(port.address))
+            if (controller->holds(port.address))
                 port.controllers.push_back(dynamic_cast<const CIM_ManagedElement*>(each));
         }
     }

@@ -32,7 +32,7 @@ struct IndexedPort {
 /// A snapshot of the ports and controllers. Holds the instances while it lives.
 class AdapterIndex {
   public:
-    /// Asks the broker for both classes, of any provider.
+    /// Asks every controller about every port: only the controller knows which addresses it holds.
     AdapterIndex();
 
     const std::vector<IndexedPort>& ports() const { return m_ports; }

@@ -83,6 +83,18 @@ std::optional<unsigned int> resolve(const MethodTraits& method, const core::CimP
     return std::nullopt;
 }
 
+/// The same, and an answer too where an instance of another provider throws: its failures never leave a
+/// method.
+std::optional<unsigned int> resolveSafely(const MethodTraits& method, const core::CimPath* source,
+                                          const core::CimPath& target, Order& order) {
+    try {
+        return resolve(method, source, target, order);
+    } catch (...) {
+        QUENX_DEBUG("Unspecified Error for '%s'", target.toString().c_str());
+        return MethodReturn::UnspecifiedError;
+    }
+}
+
 bool isSuccess(unsigned int returnValue) {
     return returnValue == MethodReturn::JobStarted || returnValue == MethodReturn::Completed;
 }
@@ -92,7 +104,7 @@ bool isSuccess(unsigned int returnValue) {
 template <class OnSuccess>
 unsigned int carryOut(const MethodTraits& method, const core::CimPath* source, const core::CimPath& target,
                       Order order, OnSuccess&& onSuccess) {
-    if (const auto refused = resolve(method, source, target, order)) return *refused;
+    if (const auto refused = resolveSafely(method, source, target, order)) return *refused;
     // Not within the try: a registry that is missing is a mistake in the program, and is to be seen as one.
     Quenx_ConcreteJobClass& registry = jobRegistry();
     const std::string targetText = target.toString();
@@ -210,7 +222,7 @@ unsigned int Quenx_SoftwareInstallationService::checkImage(const std::string& ur
     const core::RequestScope scope;
     if (!areOptionsAccepted(options)) return MethodReturn::InvalidParameter;
     Order order{{}, uri, options, values};
-    if (const auto refused = resolve(method, nullptr, target, order)) return *refused;
+    if (const auto refused = resolveSafely(method, nullptr, target, order)) return *refused;
     return returnValueOf(method, examine(order), target.toString());
 }
 
