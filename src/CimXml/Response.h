@@ -19,54 +19,6 @@ struct Failure {
     std::string description;
 };
 
-/// A qualifier (DSP0004 5.1.2) on a class or one of its elements.
-struct Qualifier {
-    std::string name;
-    core::CimValue value;
-    bool overridable = true;
-};
-
-/// The declaration of a qualifier.
-struct QualifierDeclaration {
-    std::string name;
-    core::CimType type = core::CimType::Boolean;
-    bool isArray = false;
-    bool overridable = true;
-    std::vector<std::string> scopes;  ///< "CLASS", "PROPERTY", ...
-    core::CimValue defaultValue;
-};
-
-/// An element of a class with what a client may ask to be told of it.
-struct ClassProperty {
-    core::PropertyDeclaration declaration;
-    std::string origin;  ///< empty when not asked for
-    bool propagated = false;
-    std::vector<Qualifier> qualifiers;
-};
-
-struct ClassParameter {
-    core::ParameterDeclaration declaration;
-    std::vector<Qualifier> qualifiers;
-};
-
-struct ClassMethod {
-    std::string name;
-    core::CimType returnType = core::CimType::Uint32;
-    std::string origin;
-    bool propagated = false;
-    std::vector<Qualifier> qualifiers;
-    std::vector<ClassParameter> parameters;
-};
-
-/// A class as one answer shows it.
-struct ClassElement {
-    std::string name;
-    std::string superclass;
-    std::vector<Qualifier> qualifiers;
-    std::vector<ClassProperty> properties;
-    std::vector<ClassMethod> methods;
-};
-
 /// Where each property was first declared, by folded class name and folded property name.
 using Origins = std::map<std::string, std::map<std::string, std::string>>;
 
@@ -90,9 +42,9 @@ struct IntrinsicResult {
     ResultKind kind = ResultKind::Nothing;
     std::vector<core::InstanceValue> instances;
     std::vector<core::CimPath> paths;
-    std::vector<ClassElement> classes;
+    std::vector<core::ClassDeclaration> classes;
     std::vector<std::string> classNames;
-    std::vector<QualifierDeclaration> qualifiers;
+    std::vector<core::QualifierDeclaration> qualifiers;
     std::vector<core::Argument> outputs;
     std::shared_ptr<const Origins> origins;  ///< null when class origins are not asked for
 };

@@ -2,7 +2,7 @@
 
 #include <charconv>
 
-#include "CimXml/ClassReader.h"
+#include "CimXml/ClassCodec.h"
 #include "CimXml/Envelope.h"
 #include "CimXml/ValueReader.h"
 #include "CimXml/XmlElement.h"

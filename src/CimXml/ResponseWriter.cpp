@@ -1,6 +1,6 @@
 #include "CimXml/ResponseWriter.h"
 
-#include "CimXml/ClassWriter.h"
+#include "CimXml/ClassCodec.h"
 #include "CimXml/Envelope.h"
 #include "CimXml/InstanceWriter.h"
 #include "CimXml/ValueWriter.h"
@@ -22,12 +22,12 @@ class ReturnValueWriter {
             writeOne(instance);
         for (const core::CimPath& path : m_result.paths)
             writeOne(path);
-        for (const ClassElement& element : m_result.classes)
-            writeClass(m_writer, element);
+        for (const core::ClassDeclaration& declaration : m_result.classes)
+            writeClass(m_writer, declaration);
         for (const std::string& name : m_result.classNames) {
             m_writer.start("CLASSNAME").attribute("NAME", name).empty();
         }
-        for (const QualifierDeclaration& declaration : m_result.qualifiers) {
+        for (const core::QualifierDeclaration& declaration : m_result.qualifiers) {
             writeQualifierDeclaration(m_writer, declaration);
         }
         m_writer.end("IRETURNVALUE");

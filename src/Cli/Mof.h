@@ -7,7 +7,9 @@
 
 namespace cli {
 
-/// The classes as MOF (DSP0004 annex A), superclasses before their subclasses.
-std::string mofText(std::vector<core::ClassDeclaration> classes);
+/// The classes as MOF (DSP0004 annex A) in an order that a compiler takes: the declarations of the qualifiers
+/// first, then each class after its superclass and after the classes that it refers to, as far as those do
+/// not refer to each other.
+std::string mofText(const std::vector<core::ClassDeclaration>& classes);
 
 }  // namespace cli

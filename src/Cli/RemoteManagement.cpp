@@ -40,26 +40,6 @@ std::vector<Parameter> associationParameters(const core::CimPath& path, const co
     return parameters;
 }
 
-core::ClassDeclaration declarationOf(const cimxml::ClassElement& element) {
-    core::ClassDeclaration declaration;
-    declaration.name = element.name;
-    declaration.superclass = element.superclass;
-    for (const cimxml::Qualifier& qualifier : element.qualifiers) {
-        if (core::sameName(qualifier.name, "Association")) declaration.isAssociation = true;
-    }
-    for (const cimxml::ClassProperty& property : element.properties) {
-        declaration.properties.push_back(property.declaration);
-    }
-    for (const cimxml::ClassMethod& method : element.methods) {
-        core::MethodDeclaration one{method.name, method.returnType, {}};
-        for (const cimxml::ClassParameter& parameter : method.parameters) {
-            one.parameters.push_back(parameter.declaration);
-        }
-        declaration.methods.push_back(std::move(one));
-    }
-    return declaration;
-}
-
 void requireOk(const HttpReply& reply) {
     const std::string wait = reply.retryAfter.empty() ? "a while" : reply.retryAfter + " seconds";
     const std::string why = reply.cimError.empty() ? "" : " (" + reply.cimError + ")";
@@ -182,12 +162,9 @@ void RemoteManagement::deleteInstance(const core::CimPath& path) {
 }
 
 std::vector<core::ClassDeclaration> RemoteManagement::classes() {
-    std::vector<core::ClassDeclaration> declarations;
-    const cimxml::IntrinsicResult result = callIntrinsic(
-        "EnumerateClasses", {{"DeepInheritance", std::string("TRUE")}, {"LocalOnly", std::string("TRUE")}});
-    for (const cimxml::ClassElement& element : result.classes)
-        declarations.push_back(declarationOf(element));
-    return declarations;
+    return callIntrinsic("EnumerateClasses",
+                         {{"DeepInheritance", std::string("TRUE")}, {"LocalOnly", std::string("TRUE")}})
+        .classes;
 }
 
 }  // namespace cli

@@ -24,11 +24,23 @@ constexpr core::CimMethodInfo kGadgetMethods[] = {
     {"NotImplemented", CimType::Uint32, {}},
 };
 
+constexpr core::CimElementText kThingTexts[] = {
+    {"", "A thing."},
+    {"ID", "What it is called."},
+    {"Codes", "What is known of it.", "0=Unknown;1..9=Odd;..=Reserved"},
+};
+
+constexpr core::CimElementText kGadgetTexts[] = {
+    {"Work", "Adds numbers.", "0=Nothing;..=The sum"},
+    {"Work.Numbers", "What to add.", "7=Seven"},
+};
+
 }  // namespace
 
-const core::CimClassInfo Thing::classInfo{"Test_Thing", nullptr, false, {}, core::makeSample<Thing>};
-const core::CimClassInfo Gadget::classInfo{"Test_Gadget", &Thing::classInfo, false, kGadgetMethods,
-                                           core::makeSample<Gadget>};
+const core::CimClassInfo Thing::classInfo{"Test_Thing", nullptr, false, {}, core::makeSample<Thing>,
+                                          kThingTexts};
+const core::CimClassInfo Gadget::classInfo{"Test_Gadget",  &Thing::classInfo,        false,
+                                           kGadgetMethods, core::makeSample<Gadget>, kGadgetTexts};
 const core::CimClassInfo Link::classInfo{"Test_Link", nullptr, true, {}, core::makeSample<Link>};
 
 std::atomic<int> Gadget::living{0};

@@ -1,6 +1,7 @@
 #include <filesystem>
 #include <nlohmann/json.hpp>
-#include <sstream>
+#include <regex>
+#include <set>
 
 #include "System/Quenxctl.h"
 
@@ -82,23 +83,64 @@ TEST_F(Identities, RefusalsSayWhatToDo) {
     }
 }
 
-/// Every class after its superclass, and what the tables add where it belongs.
+/// The words and signs of a MOF text, without what stands in quotes.
+std::vector<std::string> wordsOf(const std::string& mof) {
+    const std::string bare = std::regex_replace(mof, std::regex(R"("(\\.|[^"\\])*")"), "");
+    const std::regex word(R"(\w+|[^\s\w])");
+    std::vector<std::string> words;
+    for (std::sregex_iterator each(bare.begin(), bare.end(), word), end; each != end; ++each)
+        words.push_back(each->str());
+    return words;
+}
+
+/// What a MOF compiler would refuse: classes and qualifiers that are used before they are declared.
+std::string faultsOf(const std::vector<std::string>& words) {
+    std::set<std::string> classes;
+    std::set<std::string> qualifiers;
+    std::string faults;
+    const auto require = [&](const std::set<std::string>& known, const std::string& name) {
+        if (!known.contains(name)) faults += name + " is not declared\n";
+    };
+    bool isInList = false;
+    int depth = 0;  // inside a qualifier's value
+    for (std::size_t i = 0; i + 1 < words.size(); ++i) {
+        const std::string& word = words[i];
+        const std::string& next = words[i + 1];
+        if (word == "Qualifier") qualifiers.insert(next);
+        if (word == "class") classes.insert(next);
+        if (word == "class" && words[i + 2] == ":") require(classes, words[i + 3]);
+        if (next == "REF") require(classes, word);
+        if (word == "[") isInList = next != "]";
+        if (word == "]") isInList = false;
+        if (isInList) depth += word == "(" || word == "{" ? 1 : word == ")" || word == "}" ? -1 : 0;
+        if (isInList && depth == 0 && (word == "[" || word == ",")) require(qualifiers, next);
+    }
+    return faults;
+}
+
 TEST_F(Identities, TheSchemaIsInOrderAndQualified) {
     const std::string mof = withInventory({"mof"}).out;
-    std::istringstream words(mof);
+    const std::vector<std::string> words = wordsOf(mof);
+    EXPECT_EQ(faultsOf(words), "");
+    EXPECT_EQ(faultsOf(wordsOf("[ New ( \"[ Old\" ), Other ] class A : B { C REF D; };")),
+              "New is not declared\nOther is not declared\nB is not declared\nC is not declared\n");
     std::string defined = "\n";
-    for (std::string word, before; words >> word; before = word) {
-        if (before == "class") defined += word + "\n";
-        EXPECT_TRUE(before != ":" || contains(defined, "\n" + word + "\n")) << word;
-    }
+    for (std::size_t i = 1; i < words.size(); ++i)
+        if (words[i - 1] == "class") defined += words[i] + "\n";
     for (const char* name : {"Quenx_ConcreteJob", "Quenx_SoftwareInstallationService", "CIM_Job",
                              "Quenx_ElementSoftwareIdentity", "CIM_PortController"}) {
         EXPECT_TRUE(contains(defined, "\n" + std::string(name) + "\n")) << defined;
     }
     for (const char* part :
          {"\"Completed\"", "\"Method Parameters Checked - Job Started\"", "[ Association,\n   Description ( ",
-          "    [ Key ]\n    CIM_ManagedElement REF Antecedent;\n", "        [ In ]\n        string URI,\n",
-          "        [ In ( false ), Out ]\n        CIM_ConcreteJob REF Job,\n",
+          "Qualifier Key : boolean = false,\n    Scope(property, reference),\n    Flavor(DisableOverride, "
+          "ToSubclass);\n",
+          "    [ Key ]\n    CIM_ManagedElement REF Antecedent;\n",
+          "        [ In,\n           Description ( \"Where the image is.\" ) ]\n        string URI,\n",
+          "        [ In ( false ),\n           Out,\n           Description ( \"The job that was started.\" "
+          ") ]\n"
+          "        CIM_ConcreteJob REF Job,\n",
+          "    [ Key,\n       Override ( \"Antecedent\" ) ]\n",
           "ValueMap { \"1\", \"2\" },\n       Values { \"Local Time\", \"UTC Time\" } ]\n"
           "    uint16 LocalOrUtcTime;\n"}) {
         EXPECT_TRUE(contains(mof, part)) << part << "\n" << mof;

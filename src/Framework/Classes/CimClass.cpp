@@ -38,6 +38,10 @@ CimClasses::~CimClasses() {
 void CimClasses::append(ServedClass served) {
     served.name = served.object->getClassName();
     served.chain = served.info == nullptr ? undeclared(served.name) : declarationsOf(*served.info);
+    for (const auto* level = served.info; level != nullptr; level = level->superclass) {
+        for (const CimClassInfo* mentioned : level->mentioned)
+            served.mentioned.push_back(declarationsOf(*mentioned));
+    }
     auto kept = std::make_unique<ServedClass>(std::move(served));
     const utils::Mutex::AutoLocker lock(m_mutex);
     m_served.push_back(std::move(kept));

@@ -54,6 +54,7 @@ struct ServedClass {
     Delete deleteInstance = nullptr;     ///< null when its instances cannot be deleted
     std::string name;                    ///< what getClassName() says
     ClassChain chain;                    ///< never empty; without class information it holds the bare name
+    std::vector<ClassChain> mentioned = {};  ///< of the classes that its parameters name and nobody serves
 };
 
 /// The class objects of an agent, in the order of adding; owned, and destroyed in the reverse order.

@@ -28,17 +28,31 @@ struct Inherited {
         referenceClasses[foldName(property.getName())] = referenceClassOf(property);
         if (property.isKey()) keys.insert(foldName(property.getName()));
     }
+    bool has(const CimProperty& property) const {
+        return referenceClasses.contains(foldName(property.getName()));
+    }
+    /// Bindings repeat inherited properties; only a repetition that changes something is a declaration.
     bool isNewOrChanged(const CimProperty& property) const {
+        if (!has(property)) return true;
         const std::string name = foldName(property.getName());
-        const auto inherited = referenceClasses.find(name);
-        return inherited == referenceClasses.end() || (property.isKey() && !keys.contains(name)) ||
-               inherited->second != referenceClassOf(property);  // a reference narrows its class
+        return (property.isKey() && !keys.contains(name)) ||
+               referenceClasses.at(name) != referenceClassOf(property);  // a reference narrows its class
     }
 };
 
-PropertyDeclaration declare(CimProperty& property) {
-    return {property.getName(), property.getType(), property.isArray(), property.isKey(),
-            referenceClassOf(property)};
+Qualifier flag(const char* name, bool value) {
+    return {name, CimValue::of(CimType::Boolean, value)};
+}
+
+Qualifier textQualifier(const char* name, const std::string& text) {
+    return {name, CimValue::of(CimType::String, text)};
+}
+
+PropertyDeclaration declare(CimProperty& property, bool isRepeated) {
+    PropertyDeclaration result{property.getName(), property.getType(), property.isArray(), property.isKey(),
+                               referenceClassOf(property)};
+    if (isRepeated) result.qualifiers.push_back(textQualifier("Override", result.name));
+    return result;
 }
 
 /// The properties that the class adds, read off an instance of it.
@@ -52,7 +66,9 @@ std::vector<PropertyDeclaration> readProperties(const CimClassInfo& info) {
     std::size_t begin = 0;
     for (const auto& [declaring, end] : recorder.marks) {
         for (std::size_t i = begin; i < end; ++i) {
-            if (declaring == &info && inherited.isNewOrChanged(*all[i])) result.push_back(declare(*all[i]));
+            if (declaring == &info && inherited.isNewOrChanged(*all[i])) {
+                result.push_back(declare(*all[i], inherited.has(*all[i])));
+            }
         }
         for (std::size_t i = begin; i < end; ++i)
             inherited.add(*all[i]);
@@ -71,6 +87,43 @@ MethodDeclaration declare(const CimMethodInfo& method) {
     return result;
 }
 
+/// The two arrays of a value map, which belong together by position.
+std::vector<Qualifier> valueMap(std::string_view text) {
+    std::vector<CimScalar> values;
+    std::vector<CimScalar> meanings;
+    while (!text.empty()) {
+        const std::string_view one = text.substr(0, text.find(';'));
+        text.remove_prefix(std::min(text.size(), one.size() + 1));
+        const std::size_t equals = one.find('=');
+        values.emplace_back(std::string(one.substr(0, equals)));
+        meanings.emplace_back(std::string(one.substr(equals + 1)));
+    }
+    if (values.empty()) return {};
+    return {{"ValueMap", CimValue::arrayOf(CimType::String, std::move(values))},
+            {"Values", CimValue::arrayOf(CimType::String, std::move(meanings))}};
+}
+
+/// Adds the texts of the element, if the schema has any.
+void addTexts(std::vector<Qualifier>& qualifiers, const CimClassInfo& info, std::string_view element) {
+    for (const CimElementText& text : info.texts) {
+        if (text.element != element) continue;
+        qualifiers.push_back(textQualifier("Description", text.description));
+        for (Qualifier& one : valueMap(text.values))
+            qualifiers.push_back(std::move(one));
+    }
+}
+
+void addTexts(ClassDeclaration& declaration, const CimClassInfo& info) {
+    addTexts(declaration.qualifiers, info, "");
+    for (PropertyDeclaration& property : declaration.properties)
+        addTexts(property.qualifiers, info, property.name);
+    for (MethodDeclaration& method : declaration.methods) {
+        addTexts(method.qualifiers, info, method.name);
+        for (ParameterDeclaration& parameter : method.parameters)
+            addTexts(parameter.qualifiers, info, method.name + "." + parameter.name);
+    }
+}
+
 std::shared_ptr<const ClassDeclaration> read(const CimClassInfo& info) {
     auto declaration = std::make_shared<ClassDeclaration>();
     declaration->name = info.name;
@@ -79,6 +132,8 @@ std::shared_ptr<const ClassDeclaration> read(const CimClassInfo& info) {
     declaration->properties = readProperties(info);
     for (const CimMethodInfo& method : info.methods)
         declaration->methods.push_back(declare(method));
+    addImpliedQualifiers(*declaration);
+    addTexts(*declaration, info);
     return declaration;
 }
 
@@ -124,6 +179,22 @@ std::vector<ClassChain> chainsOf(std::vector<ClassDeclaration> declarations) {
         }
     }
     return chains;
+}
+
+void addImpliedQualifiers(ClassDeclaration& declaration) {
+    // MOF wants Association to be the first qualifier of its class.
+    if (declaration.isAssociation)
+        declaration.qualifiers.insert(declaration.qualifiers.begin(), flag("Association", true));
+    for (PropertyDeclaration& property : declaration.properties) {
+        if (property.isKey) property.qualifiers.insert(property.qualifiers.begin(), flag("Key", true));
+    }
+    for (MethodDeclaration& method : declaration.methods) {
+        for (ParameterDeclaration& parameter : method.parameters) {
+            const bool isInput = parameter.direction == CimDirection::In;
+            parameter.qualifiers.push_back(flag("In", isInput));
+            if (!isInput) parameter.qualifiers.push_back(flag("Out", true));
+        }
+    }
 }
 
 bool derivesFrom(const ClassChain& chain, std::string_view className) {

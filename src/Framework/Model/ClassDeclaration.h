@@ -6,6 +6,7 @@
 #include <vector>
 
 #include "Framework/Model/CimClassInfo.h"
+#include "Framework/Model/Qualifier.h"
 #include "Utils/Export.h"
 
 namespace core {
@@ -15,7 +16,10 @@ struct PropertyDeclaration {
     CimType type;
     bool isArray;
     bool isKey;
-    std::string referenceClass;  ///< empty unless the type is Reference
+    std::string referenceClass = {};  ///< empty unless the type is Reference
+    std::vector<Qualifier> qualifiers = {};
+    std::string origin = {};    ///< the class that first declared it; empty where nobody asked
+    bool isPropagated = false;  ///< comes from a superclass
 };
 
 struct ParameterDeclaration {
@@ -24,16 +28,21 @@ struct ParameterDeclaration {
     bool isArray;
     CimDirection direction;
     bool optional;
-    std::string referenceClass;  ///< empty unless the type is Reference
+    std::string referenceClass = {};  ///< empty unless the type is Reference
+    std::vector<Qualifier> qualifiers = {};
 };
 
 struct MethodDeclaration {
     std::string name;
     CimType returnType;
     std::vector<ParameterDeclaration> parameters;
+    std::vector<Qualifier> qualifiers = {};
+    std::string origin = {};    ///< as of a property
+    bool isPropagated = false;  ///< comes from a superclass
 };
 
-/// A class as a client reads it: what it adds to its superclass, or newly makes a key of. A value, with no
+/// A class as a client reads it. As a link of a chain it holds what the class adds to its superclass, or
+/// newly makes a key of; in an answer to a client it may hold inherited elements as well. A value, with no
 /// tie to the library that it was read from.
 struct ClassDeclaration {
     std::string name;
@@ -41,6 +50,7 @@ struct ClassDeclaration {
     bool isAssociation = false;
     std::vector<PropertyDeclaration> properties;
     std::vector<MethodDeclaration> methods;
+    std::vector<Qualifier> qualifiers = {};
 };
 
 /// The declarations of the class and all its superclasses, the class itself first, the root last.
@@ -53,6 +63,9 @@ QUENX_EXPORT ClassChain declarationsOf(const CimClassInfo& info);
 /// Builds the chain of each class from declarations of them and their superclasses; one that is not among
 /// them ends a chain.
 QUENX_EXPORT std::vector<ClassChain> chainsOf(std::vector<ClassDeclaration> declarations);
+
+/// Adds the qualifiers that the other members imply: Association, Key, In and Out.
+QUENX_EXPORT void addImpliedQualifiers(ClassDeclaration& declaration);
 
 /// Whether a class of that name is in the chain.
 QUENX_EXPORT bool derivesFrom(const ClassChain& chain, std::string_view className);

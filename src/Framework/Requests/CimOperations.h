@@ -55,9 +55,9 @@ class QUENX_EXPORT CimOperations {
 
     /// The class first, its superclasses behind it; empty for an unknown class.
     virtual ClassChain getClass(const std::string& className) = 0;
-    /// Each class that is served or is a superclass of one that is, of those below the named one: the direct
-    /// subclasses, or all with `deep`. An empty name stands above the roots. InvalidClass for an unknown
-    /// class.
+    /// Each class that is served, is a superclass of one that is, or is named by a parameter, of those below
+    /// the named one: the direct subclasses, or all with `deep`. An empty name stands above the roots.
+    /// InvalidClass for an unknown class.
     virtual std::vector<ClassChain> enumerateClasses(const std::string& className, bool deep) = 0;
 };
 

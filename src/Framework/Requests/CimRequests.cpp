@@ -99,9 +99,9 @@ std::vector<ClassChain> CimRequests::enumerateClasses(const std::string& classNa
     const ServedClasses classes(m_broker);
     if (!className.empty()) classes.requireChain(className);
     std::map<std::string, ClassChain> found;
-    for (const ServedClass* each : classes.all()) {
-        for (auto first = each->chain.begin(); first != each->chain.end(); ++first) {
-            ClassChain rest(first, each->chain.end());
+    for (const ClassChain* chain : classes.chains()) {
+        for (auto first = chain->begin(); first != chain->end(); ++first) {
+            ClassChain rest(first, chain->end());
             if (isBelow(rest, className, deep)) found.emplace((*first)->name, std::move(rest));
         }
     }

@@ -13,6 +13,11 @@ ServedClasses::ServedClasses(CimBroker& broker) : m_broker(broker), m_uses(broke
         const auto classes = use.agent().getClasses().getAll();
         m_classes.insert(m_classes.end(), classes.begin(), classes.end());
     }
+    for (const ServedClass* each : m_classes) {
+        m_chains.push_back(&each->chain);
+        for (const ClassChain& mentioned : each->mentioned)
+            m_chains.push_back(&mentioned);
+    }
 }
 
 std::vector<const ServedClass*> ServedClasses::derivedFrom(std::string_view className) const {
@@ -41,12 +46,11 @@ std::vector<const ServedClass*> ServedClasses::associations(std::string_view cla
 }
 
 ClassChain ServedClasses::chainOf(std::string_view className) const {
-    for (const ServedClass* each : m_classes) {
-        const ClassChain& chain = each->chain;
-        const auto found = std::find_if(chain.begin(), chain.end(), [&](const auto& declaration) {
+    for (const ClassChain* chain : m_chains) {
+        const auto found = std::find_if(chain->begin(), chain->end(), [&](const auto& declaration) {
             return sameName(declaration->name, className);
         });
-        if (found != chain.end()) return {found, chain.end()};
+        if (found != chain->end()) return {found, chain->end()};
     }
     return {};
 }

@@ -15,8 +15,8 @@ class ServedClasses {
   public:
     explicit ServedClasses(CimBroker& broker);
 
-    /// The classes that are of this class: itself and its subclasses, by every agent. CimError (invalid
-    /// class) when there is none.
+    /// The classes that are of this class: itself and its subclasses, by every agent; empty for one
+    /// that is only mentioned. CimError (invalid class) when it is unknown.
     std::vector<const ServedClass*> derivedFrom(std::string_view className) const;
     /// The classes of exactly this name, one per agent that serves it.
     std::vector<const ServedClass*> named(std::string_view className) const;
@@ -24,7 +24,9 @@ class ServedClasses {
     std::vector<const ServedClass*> associations(std::string_view className) const;
     const std::vector<const ServedClass*>& all() const { return m_classes; }
 
-    /// The chain of a served class or of a superclass of one; empty when unknown.
+    /// The chains of the served classes and of those that they mention.
+    const std::vector<const ClassChain*>& chains() const { return m_chains; }
+    /// The chain of such a class or of a superclass of one; empty when unknown.
     ClassChain chainOf(std::string_view className) const;
     /// The same; CimError (invalid class) when unknown.
     ClassChain requireChain(std::string_view className) const;
@@ -39,6 +41,7 @@ class ServedClasses {
     CimBroker& m_broker;
     std::vector<AgentUse> m_uses;
     std::vector<const ServedClass*> m_classes;
+    std::vector<const ClassChain*> m_chains;
 };
 
 }  // namespace core

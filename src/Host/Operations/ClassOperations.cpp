@@ -1,6 +1,4 @@
-#include <algorithm>
-
-#include "Host/Operations/ClassElements.h"
+#include "Host/Operations/ClassAnswer.h"
 #include "Host/Operations/Operations.h"
 
 namespace host {
@@ -34,7 +32,7 @@ IntrinsicResult getClass(const OperationContext& context, const Parameters& para
     result.kind = ResultKind::Classes;
     const core::ClassChain chain =
         requireClass(context.target, parameters.className("ClassName"), core::CimStatus::NotFound);
-    result.classes.push_back(classElement(chain, optionsOf(parameters)));
+    result.classes.push_back(classAnswer(chain, optionsOf(parameters)));
     return result;
 }
 
@@ -43,7 +41,7 @@ IntrinsicResult enumerateClasses(const OperationContext& context, const Paramete
     result.kind = ResultKind::Classes;
     const ClassOptions options = optionsOf(parameters);
     for (const core::ClassChain& chain : wantedClasses(context, parameters)) {
-        result.classes.push_back(classElement(chain, options));
+        result.classes.push_back(classAnswer(chain, options));
     }
     return result;
 }
@@ -59,22 +57,20 @@ IntrinsicResult enumerateClassNames(const OperationContext& context, const Param
 
 IntrinsicResult getQualifier(const OperationContext&, const Parameters& parameters) {
     const std::string name = parameters.text("QualifierName");
-    const auto& known = qualifierDeclarations();
-    const auto found = std::find_if(known.begin(), known.end(),
-                                    [&](const auto& each) { return core::sameName(each.name, name); });
-    if (found == known.end()) {
+    const core::QualifierDeclaration* declaration = core::findQualifierDeclaration(name);
+    if (declaration == nullptr) {
         throw core::CimError(core::CimStatus::NotFound, "no qualifier \"" + name + "\"");
     }
     IntrinsicResult result;
     result.kind = ResultKind::Qualifiers;
-    result.qualifiers = {*found};
+    result.qualifiers = {*declaration};
     return result;
 }
 
 IntrinsicResult enumerateQualifiers(const OperationContext&, const Parameters&) {
     IntrinsicResult result;
     result.kind = ResultKind::Qualifiers;
-    result.qualifiers = qualifierDeclarations();
+    result.qualifiers = core::qualifierDeclarations();
     return result;
 }
 

@@ -1,6 +1,6 @@
 #include <algorithm>
 
-#include "Host/Operations/ClassElements.h"
+#include "Host/Operations/ClassAnswer.h"
 #include "Host/Operations/Operations.h"
 
 namespace host {

@@ -76,12 +76,19 @@ class InstanceBuilder {
     core::InstanceValue m_instance;
 };
 
+std::vector<ClassDeclaration> qualifiedDeclarations() {
+    std::vector<ClassDeclaration> all = declarations();
+    for (ClassDeclaration& each : all)
+        core::addImpliedQualifiers(each);
+    return all;
+}
+
 }  // namespace
 
 InteropModel::InteropModel(std::vector<std::string> namespaces, std::string systemName)
     : m_namespaces(std::move(namespaces)),
       m_systemName(std::move(systemName)),
-      m_classes(core::chainsOf(declarations())) {}
+      m_classes(core::chainsOf(qualifiedDeclarations())) {}
 
 core::ClassChain InteropModel::findClass(const std::string& className) const {
     const auto found = std::find_if(m_classes.begin(), m_classes.end(), [&](const core::ClassChain& chain) {

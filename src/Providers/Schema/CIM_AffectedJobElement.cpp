@@ -1,7 +1,15 @@
 #include "Providers/Schema/CIM_AffectedJobElement.h"
 
+namespace {
+
+constexpr core::CimElementText kTexts[] = {
+    {"", "A job affects an element."},
+};
+
+}  // namespace
+
 constinit const core::CimClassInfo CIM_AffectedJobElement::classInfo{
-    "CIM_AffectedJobElement", nullptr, true, {}, &core::makeSample<CIM_AffectedJobElement>};
+    "CIM_AffectedJobElement", nullptr, true, {}, &core::makeSample<CIM_AffectedJobElement>, kTexts};
 
 CIM_AffectedJobElement::CIM_AffectedJobElement() {
     AffectedElement.setKey();

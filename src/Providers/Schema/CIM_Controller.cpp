@@ -1,7 +1,15 @@
 #include "Providers/Schema/CIM_Controller.h"
 
+namespace {
+
+constexpr core::CimElementText kTexts[] = {
+    {"", "A device that controls others."},
+};
+
+}  // namespace
+
 constinit const core::CimClassInfo CIM_Controller::classInfo{
-    "CIM_Controller", &CIM_LogicalDevice::classInfo, false, {}, &core::makeSample<CIM_Controller>};
+    "CIM_Controller", &CIM_LogicalDevice::classInfo, false, {}, &core::makeSample<CIM_Controller>, kTexts};
 
 CIM_Controller::CIM_Controller() {
     declareClass(classInfo);

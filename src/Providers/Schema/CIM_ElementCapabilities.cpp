@@ -1,7 +1,15 @@
 #include "Providers/Schema/CIM_ElementCapabilities.h"
 
+namespace {
+
+constexpr core::CimElementText kTexts[] = {
+    {"", "The capabilities of an element."},
+};
+
+}  // namespace
+
 constinit const core::CimClassInfo CIM_ElementCapabilities::classInfo{
-    "CIM_ElementCapabilities", nullptr, true, {}, &core::makeSample<CIM_ElementCapabilities>};
+    "CIM_ElementCapabilities", nullptr, true, {}, &core::makeSample<CIM_ElementCapabilities>, kTexts};
 
 CIM_ElementCapabilities::CIM_ElementCapabilities() {
     ManagedElement.setKey();

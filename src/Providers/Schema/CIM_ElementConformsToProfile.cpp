@@ -1,7 +1,20 @@
 #include "Providers/Schema/CIM_ElementConformsToProfile.h"
 
+namespace {
+
+constexpr core::CimElementText kTexts[] = {
+    {"", "An element conforms to a profile."},
+};
+
+}  // namespace
+
 constinit const core::CimClassInfo CIM_ElementConformsToProfile::classInfo{
-    "CIM_ElementConformsToProfile", nullptr, true, {}, &core::makeSample<CIM_ElementConformsToProfile>};
+    "CIM_ElementConformsToProfile",
+    nullptr,
+    true,
+    {},
+    &core::makeSample<CIM_ElementConformsToProfile>,
+    kTexts};
 
 CIM_ElementConformsToProfile::CIM_ElementConformsToProfile() {
     ConformantStandard.setKey();

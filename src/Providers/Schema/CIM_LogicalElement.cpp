@@ -1,10 +1,19 @@
 #include "Providers/Schema/CIM_LogicalElement.h"
 
+namespace {
+
+constexpr core::CimElementText kTexts[] = {
+    {"", "The logical parts of a system: devices, services, software."},
+};
+
+}  // namespace
+
 constinit const core::CimClassInfo CIM_LogicalElement::classInfo{"CIM_LogicalElement",
                                                                  &CIM_ManagedSystemElement::classInfo,
                                                                  false,
                                                                  {},
-                                                                 &core::makeSample<CIM_LogicalElement>};
+                                                                 &core::makeSample<CIM_LogicalElement>,
+                                                                 kTexts};
 
 CIM_LogicalElement::CIM_LogicalElement() {
     declareClass(classInfo);

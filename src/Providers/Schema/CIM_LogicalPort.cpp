@@ -1,7 +1,15 @@
 #include "Providers/Schema/CIM_LogicalPort.h"
 
+namespace {
+
+constexpr core::CimElementText kTexts[] = {
+    {"", "Where a device is connected to others."},
+};
+
+}  // namespace
+
 constinit const core::CimClassInfo CIM_LogicalPort::classInfo{
-    "CIM_LogicalPort", &CIM_LogicalDevice::classInfo, false, {}, &core::makeSample<CIM_LogicalPort>};
+    "CIM_LogicalPort", &CIM_LogicalDevice::classInfo, false, {}, &core::makeSample<CIM_LogicalPort>, kTexts};
 
 CIM_LogicalPort::CIM_LogicalPort() {
     declareClass(classInfo);

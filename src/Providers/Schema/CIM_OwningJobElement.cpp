@@ -1,7 +1,15 @@
 #include "Providers/Schema/CIM_OwningJobElement.h"
 
+namespace {
+
+constexpr core::CimElementText kTexts[] = {
+    {"", "The element that is responsible for a job."},
+};
+
+}  // namespace
+
 constinit const core::CimClassInfo CIM_OwningJobElement::classInfo{
-    "CIM_OwningJobElement", nullptr, true, {}, &core::makeSample<CIM_OwningJobElement>};
+    "CIM_OwningJobElement", nullptr, true, {}, &core::makeSample<CIM_OwningJobElement>, kTexts};
 
 CIM_OwningJobElement::CIM_OwningJobElement() {
     OwningElement.setKey();

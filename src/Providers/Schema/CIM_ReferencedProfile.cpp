@@ -1,10 +1,19 @@
 #include "Providers/Schema/CIM_ReferencedProfile.h"
 
+namespace {
+
+constexpr core::CimElementText kTexts[] = {
+    {"", "One profile refers to another."},
+};
+
+}  // namespace
+
 constinit const core::CimClassInfo CIM_ReferencedProfile::classInfo{"CIM_ReferencedProfile",
                                                                     &CIM_ReferencedSpecification::classInfo,
                                                                     true,
                                                                     {},
-                                                                    &core::makeSample<CIM_ReferencedProfile>};
+                                                                    &core::makeSample<CIM_ReferencedProfile>,
+                                                                    kTexts};
 
 CIM_ReferencedProfile::CIM_ReferencedProfile() {
     Antecedent.setKey();

@@ -1,11 +1,20 @@
 #include "Providers/Schema/CIM_ReferencedSpecification.h"
 
+namespace {
+
+constexpr core::CimElementText kTexts[] = {
+    {"", "One registered document refers to another."},
+};
+
+}  // namespace
+
 constinit const core::CimClassInfo CIM_ReferencedSpecification::classInfo{
     "CIM_ReferencedSpecification",
     &CIM_Dependency::classInfo,
     true,
     {},
-    &core::makeSample<CIM_ReferencedSpecification>};
+    &core::makeSample<CIM_ReferencedSpecification>,
+    kTexts};
 
 CIM_ReferencedSpecification::CIM_ReferencedSpecification() {
     Antecedent.setKey();

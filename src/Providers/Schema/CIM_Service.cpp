@@ -1,7 +1,15 @@
 #include "Providers/Schema/CIM_Service.h"
 
+namespace {
+
+constexpr core::CimElementText kTexts[] = {
+    {"", "The availability of functionality that can be managed."},
+};
+
+}  // namespace
+
 constinit const core::CimClassInfo CIM_Service::classInfo{
-    "CIM_Service", &CIM_EnabledLogicalElement::classInfo, false, {}, &core::makeSample<CIM_Service>};
+    "CIM_Service", &CIM_EnabledLogicalElement::classInfo, false, {}, &core::makeSample<CIM_Service>, kTexts};
 
 CIM_Service::CIM_Service() {
     SystemCreationClassName.setKey();

@@ -1,11 +1,20 @@
 #include "Providers/Schema/CIM_ServiceAccessPoint.h"
 
+namespace {
+
+constexpr core::CimElementText kTexts[] = {
+    {"", "A way to reach a service."},
+};
+
+}  // namespace
+
 constinit const core::CimClassInfo CIM_ServiceAccessPoint::classInfo{
     "CIM_ServiceAccessPoint",
     &CIM_EnabledLogicalElement::classInfo,
     false,
     {},
-    &core::makeSample<CIM_ServiceAccessPoint>};
+    &core::makeSample<CIM_ServiceAccessPoint>,
+    kTexts};
 
 CIM_ServiceAccessPoint::CIM_ServiceAccessPoint() {
     SystemCreationClassName.setKey();

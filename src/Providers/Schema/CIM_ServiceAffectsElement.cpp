@@ -1,7 +1,15 @@
 #include "Providers/Schema/CIM_ServiceAffectsElement.h"
 
+namespace {
+
+constexpr core::CimElementText kTexts[] = {
+    {"", "A service has an effect on an element."},
+};
+
+}  // namespace
+
 constinit const core::CimClassInfo CIM_ServiceAffectsElement::classInfo{
-    "CIM_ServiceAffectsElement", nullptr, true, {}, &core::makeSample<CIM_ServiceAffectsElement>};
+    "CIM_ServiceAffectsElement", nullptr, true, {}, &core::makeSample<CIM_ServiceAffectsElement>, kTexts};
 
 CIM_ServiceAffectsElement::CIM_ServiceAffectsElement() {
     AffectedElement.setKey();

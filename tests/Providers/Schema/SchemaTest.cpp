@@ -137,4 +137,28 @@ TEST(SchemaTest, DeclaresTheMethodsOfTheService) {
               "  in optional string[] InstallOptionsValues\n");
 }
 
+/// A text for an element that the class does not declare would reach no client.
+TEST(Schema, DescribesOnlyWhatItsClassesDeclare) {
+    const test::ProviderLibrary inventory(QUENX_INVENTORY_LIBRARY);
+    const test::ProviderLibrary update(QUENX_UPDATE_LIBRARY);
+    for (const auto& [name, info] : allClasses()) {
+        const auto declaration = core::declarationsOf(*info).front();
+        std::set<std::string> described;
+        const auto add = [&](const std::string& element, const std::vector<core::Qualifier>& qualifiers) {
+            if (core::findQualifier(qualifiers, "Description") != nullptr) described.insert(element);
+        };
+        add("", declaration->qualifiers);
+        for (const core::PropertyDeclaration& property : declaration->properties)
+            add(property.name, property.qualifiers);
+        for (const core::MethodDeclaration& method : declaration->methods) {
+            add(method.name, method.qualifiers);
+            for (const core::ParameterDeclaration& parameter : method.parameters)
+                add(method.name + "." + parameter.name, parameter.qualifiers);
+        }
+        for (const core::CimElementText& text : info->texts)
+            EXPECT_TRUE(described.contains(text.element)) << name << "." << text.element;
+        EXPECT_EQ(described.size(), info->texts.size()) << name;
+    }
+}
+
 }  // namespace

@@ -1,6 +1,11 @@
 #pragma once
 
-#include "CimXml/Response.h"
+#include <map>
+#include <string>
+#include <vector>
+
+#include "Framework/Model/ClassDeclaration.h"
+#include "Framework/Requests/RequestValues.h"
 
 namespace host {
 
@@ -13,16 +18,13 @@ struct ClassOptions {
 };
 
 /// The class as the answer shows it: each property and method once, by its nearest declaration, those of the
-/// superclasses first.
-cimxml::ClassElement classElement(const core::ClassChain& chain, const ClassOptions& options);
+/// superclasses first, with the qualifiers that they and the class inherit.
+core::ClassDeclaration classAnswer(const core::ClassChain& chain, const ClassOptions& options);
 
 /// The names of all properties that the class has, for a filter that leaves out what its subclasses add.
 std::vector<std::string> propertyNames(const core::ClassChain& chain);
 
 /// The class that first declared each property, by folded property name.
 std::map<std::string, std::string> originsOf(const core::ClassChain& chain);
-
-/// The qualifiers that classes here may carry.
-const std::vector<cimxml::QualifierDeclaration>& qualifierDeclarations();
 
 }  // namespace host
