@@ -2,9 +2,8 @@
 #include <benchmark/benchmark.h>
 #include <dlfcn.h>
 
-#include "CimXml/RequestReader.h"
-#include "CimXml/ResponseReader.h"
-#include "CimXml/ResponseWriter.h"
+#include "CimXml/Request.h"
+#include "CimXml/Response.h"
 #include "Framework/Requests/CimRequests.h"
 #include "InstantAdapters.h"
 

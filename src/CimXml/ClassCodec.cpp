@@ -2,9 +2,9 @@
 
 #include <algorithm>
 
+#include "CimXml/Message.h"
 #include "CimXml/ValueReader.h"
 #include "CimXml/ValueWriter.h"
-#include "CimXml/XmlElement.h"
 
 namespace cimxml {
 

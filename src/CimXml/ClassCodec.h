@@ -2,7 +2,7 @@
 
 #include <pugixml.hpp>
 
-#include "CimXml/XmlWriter.h"
+#include "CimXml/XmlText.h"
 #include "Framework/Model/ClassDeclaration.h"
 
 namespace cimxml {

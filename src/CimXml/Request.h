@@ -2,6 +2,7 @@
 
 #include <optional>
 #include <string>
+#include <string_view>
 #include <variant>
 #include <vector>
 
@@ -20,9 +21,6 @@ struct RawValue {
 
     bool isNull() const { return data.index() == 0; }
 };
-
-/// A typed value in the form in which it is written.
-RawValue rawValueOf(const core::CimValue& value);
 
 struct RawArgument {
     std::string name;
@@ -72,5 +70,32 @@ struct Request {
     /// The name of the operation or method, as the client wrote it.
     const std::string& name() const;
 };
+
+/// Reads a request message (DSP0201). Keys of paths are left as texts, and a namespace that a path lacks is
+/// taken from the call. Throws WireError for bytes that are no such message; whether operation, parameters,
+/// classes and values exist is not looked at. Thread-safe, no state.
+Request readRequest(std::string_view bytes);
+
+/// The request message of a call. Thread-safe, no state.
+std::string writeRequest(const Request& request);
+
+/// A typed value in the form in which it is written.
+RawValue rawValueOf(const core::CimValue& value);
+
+/// The CIM headers of an HTTP request (DSP0200 6.2); those that it does not have are empty.
+struct RequestHeaders {
+    std::optional<std::string> operation;        ///< CIMOperation
+    std::optional<std::string> method;           ///< CIMMethod
+    std::optional<std::string> object;           ///< CIMObject
+    std::optional<std::string> protocolVersion;  ///< CIMProtocolVersion
+    bool batch = false;                          ///< CIMBatch is there
+};
+
+/// Checks the headers alone, before there is a body. Throws WireError.
+void checkHeaders(const RequestHeaders& headers);
+
+/// Checks that the headers name the call that the body holds: CIMMethod its name, CIMObject its namespace or
+/// object. Throws WireError (header mismatch).
+void checkHeadersAgainst(const RequestHeaders& headers, const Request& request);
 
 }  // namespace cimxml

@@ -1,12 +1,8 @@
-#include "CimXml/RequestReader.h"
-
 #include <utility>
 
-#include "CimXml/Envelope.h"
-#include "CimXml/PathReader.h"
+#include "CimXml/Message.h"
+#include "CimXml/Request.h"
 #include "CimXml/ValueReader.h"
-#include "CimXml/WireError.h"
-#include "CimXml/XmlElement.h"
 
 namespace cimxml {
 

@@ -4,6 +4,7 @@
 #include <memory>
 #include <optional>
 #include <string>
+#include <string_view>
 #include <variant>
 #include <vector>
 
@@ -62,5 +63,14 @@ struct Response {
     std::string host;  ///< goes into paths that need one; host or host:port
     std::variant<Failure, IntrinsicResult, ExtrinsicResult> content;
 };
+
+/// Reads a response message, as a client. Values and keys are typed by what the message says of them. The
+/// instance of GetInstance comes without the keys in its path, since the message has none; an empty
+/// IRETURNVALUE tells no kind. Qualifier declarations are passed over. Throws WireError for bytes that are
+/// no response. Thread-safe, no state.
+Response readResponse(std::string_view bytes);
+
+/// The response message, in the forms that the common clients read. Thread-safe, no state.
+std::string writeResponse(const Response& response);
 
 }  // namespace cimxml

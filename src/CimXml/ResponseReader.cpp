@@ -1,11 +1,9 @@
-#include "CimXml/ResponseReader.h"
-
 #include <charconv>
 
 #include "CimXml/ClassCodec.h"
-#include "CimXml/Envelope.h"
+#include "CimXml/Message.h"
+#include "CimXml/Response.h"
 #include "CimXml/ValueReader.h"
-#include "CimXml/XmlElement.h"
 
 namespace cimxml {
 

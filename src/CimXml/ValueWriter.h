@@ -4,8 +4,8 @@
 #include <string_view>
 
 #include "CimXml/Request.h"
-#include "CimXml/XmlWriter.h"
-#include "Framework/Requests/CimRequests.h"
+#include "CimXml/XmlText.h"
+#include "Framework/Requests/RequestValues.h"
 
 namespace cimxml {
 

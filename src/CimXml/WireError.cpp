@@ -1,39 +1,42 @@
 #include "CimXml/WireError.h"
 
+#include <algorithm>
+#include <iterator>
+
 namespace cimxml {
 
+namespace {
+
+struct FaultRow {
+    WireFault fault;
+    int status;
+    const char* name;
+};
+
+constexpr FaultRow kFaults[] = {
+    {WireFault::NotWellFormed, 400, "request-not-well-formed"},
+    {WireFault::NotValid, 400, "request-not-valid"},
+    {WireFault::HeaderMismatch, 400, "header-mismatch"},
+    {WireFault::UnsupportedOperation, 400, "unsupported-operation"},
+    {WireFault::UnsupportedProtocol, 501, "unsupported-protocol-version"},
+    {WireFault::UnsupportedCimVersion, 501, "unsupported-cim-version"},
+    {WireFault::UnsupportedDtdVersion, 501, "unsupported-dtd-version"},
+    {WireFault::MultipleRequests, 501, "multiple-requests-unsupported"},
+};
+
+const FaultRow& rowOf(WireFault fault) {
+    return *std::find_if(std::begin(kFaults), std::end(kFaults),
+                         [&](const FaultRow& row) { return row.fault == fault; });
+}
+
+}  // namespace
+
 int httpStatus(WireFault fault) {
-    switch (fault) {
-        case WireFault::NotWellFormed:
-        case WireFault::NotValid:
-        case WireFault::HeaderMismatch:
-        case WireFault::UnsupportedOperation:
-            return 400;
-        default:
-            return 501;
-    }
+    return rowOf(fault).status;
 }
 
 const char* cimErrorHeader(WireFault fault) {
-    switch (fault) {
-        case WireFault::NotWellFormed:
-            return "request-not-well-formed";
-        case WireFault::NotValid:
-            return "request-not-valid";
-        case WireFault::HeaderMismatch:
-            return "header-mismatch";
-        case WireFault::UnsupportedOperation:
-            return "unsupported-operation";
-        case WireFault::UnsupportedProtocol:
-            return "unsupported-protocol-version";
-        case WireFault::UnsupportedCimVersion:
-            return "unsupported-cim-version";
-        case WireFault::UnsupportedDtdVersion:
-            return "unsupported-dtd-version";
-        case WireFault::MultipleRequests:
-            return "multiple-requests-unsupported";
-    }
-    return "request-not-valid";
+    return rowOf(fault).name;
 }
 
 }  // namespace cimxml

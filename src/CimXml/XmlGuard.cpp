@@ -238,4 +238,15 @@ void checkWellFormed(std::string_view document, const XmlLimits& limits) {
     Scanner(document, limits).scan();
 }
 
+void parseDocument(pugi::xml_document& document, std::string_view bytes) {
+    checkWellFormed(bytes);
+    // Blanks count inside VALUE, so none are dropped here; readers pass over those between
+    // elements.
+    constexpr unsigned int kOptions = pugi::parse_cdata | pugi::parse_escapes | pugi::parse_eol |
+                                      pugi::parse_wconv_attribute | pugi::parse_ws_pcdata;
+    const pugi::xml_parse_result result =
+        document.load_buffer(bytes.data(), bytes.size(), kOptions, pugi::encoding_utf8);
+    if (!result) throw WireError(WireFault::NotWellFormed, result.description());
+}
+
 }  // namespace cimxml

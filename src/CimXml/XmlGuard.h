@@ -1,6 +1,7 @@
 #pragma once
 
 #include <cstddef>
+#include <pugixml.hpp>
 #include <string_view>
 
 namespace cimxml {
@@ -19,5 +20,8 @@ struct XmlLimits {
 ///
 /// Throws WireError (not well-formed), also when a limit is passed.
 void checkWellFormed(std::string_view document, const XmlLimits& limits = {});
+
+/// Checks the bytes and builds the tree. Throws WireError (not well-formed).
+void parseDocument(pugi::xml_document& document, std::string_view bytes);
 
 }  // namespace cimxml

@@ -1,7 +1,7 @@
 #include "Cli/RemoteManagement.h"
 
-#include "CimXml/RequestWriter.h"
-#include "CimXml/ResponseReader.h"
+#include "CimXml/Request.h"
+#include "CimXml/Response.h"
 #include "CimXml/WireError.h"
 #include "Cli/Failure.h"
 

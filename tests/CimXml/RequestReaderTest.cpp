@@ -1,8 +1,7 @@
-#include "CimXml/RequestReader.h"
+#include "CimXml/Request.h"
 
 #include <gtest/gtest.h>
 
-#include "CimXml/RequestWriter.h"
 #include "CimXml/WireCheck.h"
 #include "CimXml/WireError.h"
 

@@ -1,8 +1,7 @@
-#include "CimXml/ResponseWriter.h"
+#include "CimXml/Response.h"
 
 #include <gtest/gtest.h>
 
-#include "CimXml/ResponseReader.h"
 #include "CimXml/WireCheck.h"
 #include "CimXml/WireError.h"
 

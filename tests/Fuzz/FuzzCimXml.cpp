@@ -1,9 +1,7 @@
 #include <string>
 
-#include "CimXml/RequestReader.h"
-#include "CimXml/RequestWriter.h"
-#include "CimXml/ResponseReader.h"
-#include "CimXml/ResponseWriter.h"
+#include "CimXml/Request.h"
+#include "CimXml/Response.h"
 #include "CimXml/WireError.h"
 #include "CimXml/XmlGuard.h"
 #include "Fuzz/Require.h"

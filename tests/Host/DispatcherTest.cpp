@@ -2,8 +2,7 @@
 
 #include <gtest/gtest.h>
 
-#include "CimXml/ResponseReader.h"
-#include "CimXml/ResponseWriter.h"
+#include "CimXml/Response.h"
 #include "CimXml/WireCheck.h"
 #include "Framework/Requests/CimRequests.h"
 #include "Support/TestModel.h"

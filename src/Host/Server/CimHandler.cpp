@@ -1,7 +1,7 @@
 #include "Host/Server/CimHandler.h"
 
-#include "CimXml/RequestReader.h"
-#include "CimXml/ResponseWriter.h"
+#include "CimXml/Request.h"
+#include "CimXml/Response.h"
 #include "CimXml/WireError.h"
 #include "Utils/Log.h"
 

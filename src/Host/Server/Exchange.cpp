@@ -44,7 +44,7 @@ HttpHead readHead(MHD_Connection* connection, const char* method) {
     head.contentType = header("Content-Type");
     head.contentLength = header("Content-Length");
     head.chunked = header("Transfer-Encoding").has_value();
-    head.cim = {header("CIMOperation"), header("CIMMethod"), header("CIMProtocolVersion"),
+    head.cim = {header("CIMOperation"), header("CIMMethod"), std::nullopt, header("CIMProtocolVersion"),
                 header("CIMBatch").has_value()};
     return head;
 }

@@ -6,7 +6,7 @@
 #include <utility>
 #include <vector>
 
-#include "CimXml/Headers.h"
+#include "CimXml/Request.h"
 
 namespace host {
 

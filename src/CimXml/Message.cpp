@@ -1,7 +1,7 @@
-#include "CimXml/Envelope.h"
+#include "CimXml/Message.h"
 
 #include "CimXml/WireError.h"
-#include "CimXml/XmlElement.h"
+#include "CimXml/XmlGuard.h"
 
 namespace cimxml {
 
@@ -59,6 +59,49 @@ void startEnvelope(XmlWriter& writer, std::string_view messageId, std::string_vi
 void endEnvelope(XmlWriter& writer, std::string_view wrapper) {
     writer.end(wrapper).end("MESSAGE").end("CIM");
     writer.raw("\n");
+}
+
+std::vector<pugi::xml_node> childElements(const pugi::xml_node& element) {
+    std::vector<pugi::xml_node> children;
+    for (const pugi::xml_node& child : element.children()) {
+        if (child.type() == pugi::node_element) {
+            children.push_back(child);
+        } else if (std::string_view(child.value()).find_first_not_of(" \t\r\n") != std::string_view::npos) {
+            refuseElement(element, "holds text");
+        }
+    }
+    return children;
+}
+
+pugi::xml_node onlyChild(const pugi::xml_node& element) {
+    const std::vector<pugi::xml_node> children = childElements(element);
+    if (children.size() != 1) refuseElement(element, "must hold one element");
+    return children.front();
+}
+
+std::string requiredAttribute(const pugi::xml_node& element, const char* name) {
+    const pugi::xml_attribute attribute = element.attribute(name);
+    if (!attribute) refuseElement(element, std::string("has no attribute ") + name);
+    return attribute.value();
+}
+
+std::string textOf(const pugi::xml_node& element) {
+    std::string text;
+    for (const pugi::xml_node& child : element.children()) {
+        if (child.type() == pugi::node_element) refuseElement(element, "must hold text only");
+        text += child.value();
+    }
+    return text;
+}
+
+void expectElement(const pugi::xml_node& element, std::string_view name) {
+    if (!isElement(element, name)) {
+        refuseElement(element, "stands where " + std::string(name) + " was expected");
+    }
+}
+
+void refuseElement(const pugi::xml_node& element, std::string_view why) {
+    throw WireError(WireFault::NotValid, "element " + std::string(element.name()) + " " + std::string(why));
 }
 
 }  // namespace cimxml

@@ -5,10 +5,25 @@
 #include <string_view>
 #include <vector>
 
+#include "CimXml/XmlText.h"
+
 namespace cimxml {
 
-/// Checks the bytes (see checkWellFormed) and builds the tree. WireError when they are no document.
-void parseDocument(pugi::xml_document& document, std::string_view bytes);
+/// What a message carries, with the wrapping taken off.
+struct Envelope {
+    std::string messageId;
+    pugi::xml_node content;  ///< the call or the response; lives as long as the document
+};
+
+/// Reads the bytes into the document and opens CIM, MESSAGE and SIMPLEREQ or SIMPLERSP, as named. Any minor
+/// version is taken. Throws WireError.
+Envelope openEnvelope(pugi::xml_document& document, std::string_view bytes, std::string_view wrapper);
+
+/// Writes the same in front of a message's content, and behind it.
+void startEnvelope(XmlWriter& writer, std::string_view messageId, std::string_view wrapper);
+void endEnvelope(XmlWriter& writer, std::string_view wrapper);
+
+// The elements inside. All that a reader finds wrong with them is WireError (not valid).
 
 /// The child elements, in order. WireError (not valid) when there is text between them.
 std::vector<pugi::xml_node> childElements(const pugi::xml_node& element);

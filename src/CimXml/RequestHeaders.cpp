@@ -1,0 +1,114 @@
+// The HTTP headers of a request, and whether they say what its body says.
+#include <algorithm>
+#include <array>
+#include <charconv>
+
+#include "CimXml/Request.h"
+#include "CimXml/WireError.h"
+
+namespace cimxml {
+
+namespace {
+
+/// The text with every %XX replaced by its byte; anything else stays.
+std::string percentDecoded(std::string_view text) {
+    std::string decoded;
+    for (std::size_t i = 0; i < text.size(); ++i) {
+        unsigned int byte = 0;
+        if (text[i] == '%' && text.size() - i > 2) {
+            const char* end = text.data() + i + 3;
+            if (std::from_chars(text.data() + i + 1, end, byte, 16).ptr == end) {
+                decoded += static_cast<char>(byte);
+                i += 2;
+                continue;
+            }
+        }
+        decoded += text[i];
+    }
+    return decoded;
+}
+
+bool isSameNamespace(std::string_view header, const std::string& body) {
+    if (header.starts_with("//")) header.remove_prefix(std::min(header.find('/', 2), header.size()));
+    core::CimPath path;
+    path.setNamespace(header);  // without the slashes at its ends
+    return core::sameName(path.getNamespace(), body);
+}
+
+std::string withoutEscapes(std::string text) {
+    std::erase(text, '\\');
+    return text;
+}
+
+/// The body's keys are texts, the header's are typed by how they are written.
+bool isSameKey(const core::CimScalar& header, const core::CimScalar& body) {
+    using core::CimType;
+    constexpr std::array kTypes{CimType::Boolean, CimType::Uint64,   CimType::Sint64,   CimType::Real64,
+                                CimType::String,  CimType::Datetime, CimType::Reference};
+    const auto* text = std::get_if<std::string>(&body);
+    if (text == nullptr) return true;  // a reference: the class and the other keys have to do
+    // There are clients that escape nothing in the header.
+    if (const auto* quoted = std::get_if<std::string>(&header))
+        return withoutEscapes(*quoted) == withoutEscapes(*text);
+    const auto typed = core::parseScalar(kTypes[header.index()], *text);
+    return typed && core::sameValue(header, *typed);
+}
+
+bool isSameObject(const core::CimPath& header, const core::CimPath& body) {
+    const auto& keys = header.getKeys();
+    return isSameNamespace(header.getNamespace(), body.getNamespace()) &&
+           core::sameName(header.getClassName(), body.getClassName()) &&
+           keys.size() == body.getKeys().size() &&
+           std::all_of(keys.begin(), keys.end(), [&](const core::CimKey& key) {
+               return std::any_of(
+                   body.getKeys().begin(), body.getKeys().end(), [&](const core::CimKey& other) {
+                       return core::sameName(key.name, other.name) && isSameKey(key.value, other.value);
+                   });
+           });
+}
+
+/// Whether CIMObject names what the body calls: a namespace for an intrinsic operation, else an object.
+struct ObjectMatcher {
+    const std::string& header;
+
+    bool operator()(const IntrinsicCall& call) const { return isSameNamespace(header, call.namespaceName); }
+
+    bool operator()(const MethodCall& call) const {
+        const core::CimPath path(header);
+        if (path.isValid()) return isSameObject(path, call.object);
+        // A key that holds quotes, unescaped, is not a path; what stands before the keys still counts.
+        const core::CimPath named(header.substr(0, header.find('.')));
+        return named.isValid() && isSameNamespace(named.getNamespace(), call.object.getNamespace()) &&
+               core::sameName(named.getClassName(), call.object.getClassName());
+    }
+};
+
+}  // namespace
+
+const std::string& Request::name() const {
+    const auto* method = std::get_if<MethodCall>(&call);
+    return method != nullptr ? method->method : std::get<IntrinsicCall>(call).operation;
+}
+
+void checkHeaders(const RequestHeaders& headers) {
+    if (headers.batch) throw WireError(WireFault::MultipleRequests, "several requests in one message");
+    if (headers.operation && !core::sameName(*headers.operation, "MethodCall")) {
+        throw WireError(WireFault::UnsupportedOperation, "CIMOperation is not MethodCall");
+    }
+    if (headers.protocolVersion && !headers.protocolVersion->starts_with("1.")) {
+        throw WireError(WireFault::UnsupportedProtocol, "CIMProtocolVersion is not 1.x");
+    }
+}
+
+void checkHeadersAgainst(const RequestHeaders& headers, const Request& request) {
+    if (headers.method && !core::sameName(percentDecoded(*headers.method), request.name())) {
+        throw WireError(WireFault::HeaderMismatch, "CIMMethod is not the method that the message calls");
+    }
+    if (!headers.object) return;
+    const std::string object = percentDecoded(*headers.object);
+    if (!std::visit(ObjectMatcher{object}, request.call)) {
+        throw WireError(WireFault::HeaderMismatch, "CIMObject is not the object that the message names");
+    }
+}
+
+}  // namespace cimxml
