@@ -46,6 +46,7 @@ bool startsWith(const pugi::xml_node& element, std::string_view name) {
 }
 
 Qualifier readQualifier(const pugi::xml_node& element) {
+    // A QUALIFIER does not say whether it is an array, only its value does; null counts as a single one.
     const RawValue raw = readValue(element, "TYPE", KeyTyping::ByAttributes);
     const bool isArray = std::holds_alternative<std::vector<std::string>>(raw.data);
     const auto value = typedValueOf(raw, typeOf(element), isArray);
@@ -85,6 +86,7 @@ core::PropertyDeclaration readProperty(const pugi::xml_node& element) {
 core::ParameterDeclaration readParameter(const pugi::xml_node& element) {
     Shape shape = shapeOf(element);
     std::vector<Qualifier> qualifiers = readQualifiers(element);
+    // One that goes both ways counts as an output here: it need not be given.
     const bool isOutput = isSet(qualifiers, "Out");
     return {requiredAttribute(element, "NAME"),
             shape.type,

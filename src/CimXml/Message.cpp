@@ -7,6 +7,7 @@ namespace cimxml {
 
 namespace {
 
+/// Only the major version tells of another language; a client may use any minor one.
 void checkVersion(const pugi::xml_node& element, const char* attribute, std::string_view major,
                   WireFault fault) {
     const std::string version = requiredAttribute(element, attribute);
@@ -42,6 +43,7 @@ Envelope openEnvelope(pugi::xml_document& document, std::string_view bytes, std:
     envelope.messageId = requiredAttribute(message, "ID");
     checkVersion(message, "PROTOCOLVERSION", "1.", WireFault::UnsupportedProtocol);
     const pugi::xml_node wrapped = onlyChild(message);
+    // Refused by its own name, so that a client that can batch falls back to single requests.
     if (isElement(wrapped, "MULTIREQ")) {
         throw WireError(WireFault::MultipleRequests, "several requests in one message");
     }
@@ -51,6 +53,7 @@ Envelope openEnvelope(pugi::xml_document& document, std::string_view bytes, std:
 }
 
 void startEnvelope(XmlWriter& writer, std::string_view messageId, std::string_view wrapper) {
+    // There are clients that refuse a message without the XML declaration.
     writer.raw("<?xml version=\"1.0\" encoding=\"utf-8\"?>\n<CIM CIMVERSION=\"2.0\" DTDVERSION=\"2.0\">");
     writer.start("MESSAGE").attribute("ID", messageId).attribute("PROTOCOLVERSION", "1.0").content();
     writer.open(wrapper);
@@ -79,6 +82,7 @@ pugi::xml_node onlyChild(const pugi::xml_node& element) {
     return children.front();
 }
 
+// The messages name the element, because a client's author sees nothing else of what the server made of it.
 std::string requiredAttribute(const pugi::xml_node& element, const char* name) {
     const pugi::xml_attribute attribute = element.attribute(name);
     if (!attribute) refuseElement(element, std::string("has no attribute ") + name);
@@ -86,6 +90,7 @@ std::string requiredAttribute(const pugi::xml_node& element, const char* name) {
 }
 
 std::string textOf(const pugi::xml_node& element) {
+    // A comment or a CDATA section cuts one text into several nodes.
     std::string text;
     for (const pugi::xml_node& child : element.children()) {
         if (child.type() == pugi::node_element) refuseElement(element, "must hold text only");

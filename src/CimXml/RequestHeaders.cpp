@@ -10,6 +10,7 @@ namespace cimxml {
 
 namespace {
 
+/// Clients encode as much of these headers as they like: some nothing, some the slashes and colons, some all.
 /// The text with every %XX replaced by its byte; anything else stays.
 std::string percentDecoded(std::string_view text) {
     std::string decoded;
@@ -95,6 +96,7 @@ void checkHeaders(const RequestHeaders& headers) {
     if (headers.operation && !core::sameName(*headers.operation, "MethodCall")) {
         throw WireError(WireFault::UnsupportedOperation, "CIMOperation is not MethodCall");
     }
+    // Without the header it is 1.0 (DSP0200 6.2).
     if (headers.protocolVersion && !headers.protocolVersion->starts_with("1.")) {
         throw WireError(WireFault::UnsupportedProtocol, "CIMProtocolVersion is not 1.x");
     }

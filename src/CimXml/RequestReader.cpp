@@ -30,6 +30,7 @@ std::vector<std::string> readList(const pugi::xml_node& element) {
 }
 
 ParameterValue readParameterValue(const pugi::xml_node& element) {
+    // What kind of value a parameter takes is the operation's to check; here every kind is read.
     if (isElement(element, "VALUE")) return textOf(element);
     if (isElement(element, "VALUE.ARRAY")) return readList(element);
     if (isElement(element, "VALUE.REFERENCE")) return readReference(element, KeyTyping::Text);
@@ -54,6 +55,7 @@ IntrinsicCall readIntrinsicCall(const pugi::xml_node& element) {
         expectElement(children[i], "IPARAMVALUE");
         Parameter& parameter = call.parameters.emplace_back();
         parameter.name = requiredAttribute(children[i], "NAME");
+        // Some clients send each parameter and leave those empty that they do not use.
         if (childElements(children[i]).empty()) continue;
         parameter.value = readParameterValue(onlyChild(children[i]));
         if (auto* path = std::get_if<core::CimPath>(&parameter.value)) {
@@ -84,6 +86,7 @@ MethodCall readMethodCall(const pugi::xml_node& element) {
     call.object = std::move(object.path);
     call.object.completeNamespace(call.object.getNamespace());
     call.isClass = object.isClass;
+    // Keys and arguments stay texts where the message states no type: the declaration knows better.
     for (std::size_t i = 1; i < children.size(); ++i) {
         expectElement(children[i], "PARAMVALUE");
         RawArgument& argument = call.arguments.emplace_back();

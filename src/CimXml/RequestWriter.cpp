@@ -9,6 +9,7 @@ namespace {
 template <class T>
 T heldAs(core::CimType type, const core::CimScalar& value) {
     if constexpr (std::is_same_v<T, core::CimPath>) {
+        // A reference may also be held as the text that somebody typed.
         const auto* path = std::get_if<core::CimPath>(&value);
         return path != nullptr ? *path : core::CimPath(core::scalarText(type, value));
     } else {
@@ -66,6 +67,7 @@ struct CallWriter {
     XmlWriter& writer;
 
     void operator()(const IntrinsicCall& call) const {
+        // Intrinsic operations act on a namespace, so it stands in front and paths go without one.
         writer.start("IMETHODCALL").attribute("NAME", call.operation).content();
         writeNamespace(writer, call.namespaceName);
         for (const Parameter& parameter : call.parameters) {

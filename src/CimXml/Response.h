@@ -15,7 +15,7 @@
 namespace cimxml {
 
 /// A CIM error: the operation was understood and did not succeed.
-struct Failure {
+struct ErrorResult {
     core::CimStatus status = core::CimStatus::Failed;
     std::string description;
 };
@@ -50,18 +50,12 @@ struct IntrinsicResult {
     std::shared_ptr<const Origins> origins;  ///< null when class origins are not asked for
 };
 
-/// The result of a method. Null outputs are not sent.
-struct ExtrinsicResult {
-    core::CimType returnType = core::CimType::Uint32;
-    core::MethodResult result;
-};
-
 struct Response {
     std::string messageId;
     std::string name;  ///< of the operation or method, as the request has it
     bool isMethod = false;
     std::string host;  ///< goes into paths that need one; host or host:port
-    std::variant<Failure, IntrinsicResult, ExtrinsicResult> content;
+    std::variant<ErrorResult, IntrinsicResult, core::MethodResult> content;
 };
 
 /// Reads a response message, as a client. Values and keys are typed by what the message says of them. The

@@ -9,6 +9,7 @@ namespace cimxml {
 
 namespace {
 
+// A client knows no declarations, so it has nothing but the attributes to go by.
 constexpr KeyTyping kTyping = KeyTyping::ByAttributes;
 
 core::CimValue readTyped(const pugi::xml_node& element, const char* typeAttribute,
@@ -42,6 +43,7 @@ core::InstanceValue readInstance(const pugi::xml_node& element) {
     return instance;
 }
 
+/// An INSTANCE does not say which of its properties are keys; the path in front of it does.
 void markKeys(core::InstanceValue& instance) {
     for (core::PropertyValue& property : instance.properties) {
         for (const core::CimKey& key : instance.path.getKeys()) {
@@ -115,6 +117,7 @@ void readReturned(IntrinsicResult& result, const pugi::xml_node& element) {
 core::Argument readOutput(const pugi::xml_node& element) {
     expectElement(element, "PARAMVALUE");
     const RawValue raw = readValue(element, "PARAMTYPE", kTyping);
+    // PARAMVALUE is the same element for arrays and single values; only what is inside tells.
     const bool isArray = raw.data.index() > 2;
     const auto value = typedValueOf(raw, std::nullopt, isArray);
     if (!value) refuseElement(element, "holds no value of its type");
@@ -128,8 +131,9 @@ std::uint32_t readNumber(const pugi::xml_node& element, const std::string& text)
     return number;
 }
 
-Failure readFailure(const pugi::xml_node& element) {
+ErrorResult readError(const pugi::xml_node& element) {
     const std::uint32_t code = readNumber(element, requiredAttribute(element, "CODE"));
+    // A status that this version does not know still has a number and a text to show.
     return {static_cast<core::CimStatus>(code), element.attribute("DESCRIPTION").value()};
 }
 
@@ -146,16 +150,17 @@ IntrinsicResult readIntrinsic(const std::vector<pugi::xml_node>& parts) {
     return result;
 }
 
-ExtrinsicResult readExtrinsic(const std::vector<pugi::xml_node>& parts) {
-    ExtrinsicResult result;
+core::MethodResult readExtrinsic(const std::vector<pugi::xml_node>& parts) {
+    core::MethodResult result;
     for (const pugi::xml_node& part : parts) {
         if (!isElement(part, "RETURNVALUE")) {
-            result.result.outputs.push_back(readOutput(part));
+            result.outputs.push_back(readOutput(part));
             continue;
         }
+        // There are servers that leave the type out; the methods of this schema return uint32.
         const auto type = core::typeByName(part.attribute("PARAMTYPE").value());
         result.returnType = type.value_or(core::CimType::Uint32);
-        result.result.returnValue = readNumber(part, textOf(onlyChild(part)));
+        result.returnValue = readNumber(part, textOf(onlyChild(part)));
     }
     return result;
 }
@@ -172,7 +177,7 @@ Response readResponse(std::string_view bytes) {
     response.name = requiredAttribute(envelope.content, "NAME");
     const std::vector<pugi::xml_node> parts = childElements(envelope.content);
     if (!parts.empty() && isElement(parts.front(), "ERROR")) {
-        response.content = readFailure(parts.front());
+        response.content = readError(parts.front());
     } else if (response.isMethod) {
         response.content = readExtrinsic(parts);
     } else {

@@ -10,6 +10,7 @@ namespace {
 using ClassOrigins = std::map<std::string, std::string>;
 
 const ClassOrigins* originsOf(const Origins* origins, const std::string& className) {
+    // A list may hold instances of several classes, so there is a table for each.
     if (origins == nullptr) return nullptr;
     const auto found = origins->find(core::foldName(className));
     return found == origins->end() ? nullptr : &found->second;
@@ -23,6 +24,7 @@ std::string_view elementOf(const core::CimValue& value) {
 void writeProperty(XmlWriter& writer, const core::PropertyValue& property, const ClassOrigins* origins) {
     const std::string_view element = elementOf(property.value);
     writer.start(element).attribute("NAME", property.name);
+    // PROPERTY.REFERENCE has no attribute TYPE, and there are readers that fail on an unknown attribute.
     if (element == "PROPERTY.REFERENCE") {
         if (!property.referenceClass.empty()) writer.attribute("REFERENCECLASS", property.referenceClass);
     } else {
@@ -54,6 +56,7 @@ class ReturnValueWriter {
         : m_writer(writer), m_result(result), m_host(host) {}
 
     void write() const {
+        // A void operation has no IRETURNVALUE and an empty list has an empty one: clients tell them apart.
         if (m_result.kind == ResultKind::Nothing) return;
         m_writer.open("IRETURNVALUE");
         for (const core::InstanceValue& instance : m_result.instances)
@@ -76,6 +79,7 @@ class ReturnValueWriter {
         const std::string_view wrapper = wrapperOfInstance();
         if (!wrapper.empty()) {
             m_writer.open(wrapper);
+            // Only an enumeration answers for one namespace and host, which the client knows already.
             if (m_result.kind == ResultKind::NamedInstances) {
                 writeInstanceName(m_writer, instance.path);
             } else {
@@ -120,23 +124,25 @@ struct ContentWriter {
     XmlWriter& writer;
     const Response& response;
 
-    void operator()(const Failure& failure) const {
-        writer.start("ERROR").attribute("CODE", std::to_string(static_cast<int>(failure.status)));
-        writer.attribute("DESCRIPTION", failure.description).empty();
+    void operator()(const ErrorResult& error) const {
+        writer.start("ERROR").attribute("CODE", std::to_string(static_cast<int>(error.status)));
+        writer.attribute("DESCRIPTION", error.description).empty();
     }
     void operator()(const IntrinsicResult& result) const {
         ReturnValueWriter(writer, result, response.host).write();
         writeOutputs(result.outputs);
     }
-    void operator()(const ExtrinsicResult& result) const {
+    void operator()(const core::MethodResult& result) const {
+        // Clients expect RETURNVALUE first and with its type.
         writer.start("RETURNVALUE").attribute("PARAMTYPE", core::typeName(result.returnType)).content();
-        writer.open("VALUE").raw(std::to_string(result.result.returnValue)).end("VALUE").end("RETURNVALUE");
-        writeOutputs(result.result.outputs);
+        writer.open("VALUE").raw(std::to_string(result.returnValue)).end("VALUE").end("RETURNVALUE");
+        writeOutputs(result.outputs);
     }
 
   private:
     void writeOutputs(const std::vector<core::Argument>& outputs) const {
         for (const core::Argument& output : outputs) {
+            // There are clients that crash on a PARAMVALUE without a value.
             if (!output.value.isNull()) writeParamValue(writer, output);
         }
     }

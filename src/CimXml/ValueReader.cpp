@@ -10,6 +10,9 @@ namespace cimxml {
 
 namespace {
 
+/// TYPE is precise where it is there; VALUETYPE tells numbers from texts but not their width. A text that is
+/// no value of its stated type stays a text, since a foreign server's path still has to be sent back as it
+/// came.
 core::CimScalar typedText(const pugi::xml_node& element, std::string text) {
     if (const auto type = core::typeByName(element.attribute("TYPE").value())) {
         return core::parseScalar(*type, text).value_or(core::CimScalar(text));
@@ -40,6 +43,7 @@ core::CimPath readInstanceName(const pugi::xml_node& element, KeyTyping typing) 
         if (isElement(child, "KEYBINDING")) {
             keys.push_back({requiredAttribute(child, "NAME"), readKeyValue(onlyChild(child), typing)});
         } else if (children.size() == 1) {
+            // DSP0201 lets the key of a class with a single one go without its name.
             keys.push_back({"", readKeyValue(child, typing)});
         } else {
             refuseElement(child, "stands where KEYBINDING was expected");
@@ -156,6 +160,7 @@ ObjectName readObject(const pugi::xml_node& element, KeyTyping typing) {
     if (isElement(element, "INSTANCENAME")) return {readInstanceName(element, typing), false};
     if (!isPlaced(element)) refuseElement(element, "names no object");
     const std::vector<pugi::xml_node> parts = childElements(element);
+    // A placed name inside a placed name would let a message nest without end.
     if (parts.size() != 2 || isPlaced(parts[1])) refuseElement(element, "must hold a namespace and a name");
     Place place = readPlace(parts[0]);
     ObjectName object = readObject(parts[1], typing);

@@ -12,6 +12,8 @@ struct KeyType {
     core::CimType cimType;
 };
 
+/// The attributes of a key. Old clients know VALUETYPE alone, and TYPE tells apart what it throws together; a
+/// wrong width in TYPE would be worse than none.
 struct KeyTypes {
     KeyType operator()(bool) const { return {"boolean", "boolean", core::CimType::Boolean}; }
     KeyType operator()(std::uint64_t) const { return {"numeric", "", core::CimType::Uint64}; }
@@ -25,6 +27,7 @@ struct KeyTypes {
 };
 
 void writeText(XmlWriter& writer, core::CimType type, const core::CimScalar& value) {
+    // Most values are texts, and copying one only to escape it costs as much again.
     if (const auto* text = std::get_if<std::string>(&value)) {
         writer.text(*text);
     } else {
@@ -91,6 +94,7 @@ void writeLocalPath(XmlWriter& writer, const core::CimPath& path) {
 
 void writeInstancePath(XmlWriter& writer, const core::CimPath& path, std::string_view host) {
     writer.open("INSTANCEPATH").open("NAMESPACEPATH").open("HOST");
+    // With host and port in it, a client can put a scheme in front of the path and come back with it.
     writer.text(path.getHost().empty() ? host : std::string_view(path.getHost())).end("HOST");
     writeNamespace(writer, path.getNamespace());
     writer.end("NAMESPACEPATH");
@@ -100,6 +104,7 @@ void writeInstancePath(XmlWriter& writer, const core::CimPath& path, std::string
 
 void writeReference(XmlWriter& writer, const core::CimPath& path) {
     writer.open("VALUE.REFERENCE");
+    // Both common clients read a local path in any place; a bare name would leave them without a namespace.
     if (path.getNamespace().empty() && path.isInstancePath()) {
         writeInstanceName(writer, path);
     } else {

@@ -37,6 +37,10 @@ bool isUtf8Name(std::string_view encoding) {
     return folded == "utf-8" || folded == "utf8" || folded == "us-ascii";
 }
 
+// pugixml is fast because it checks little: it takes unbalanced quotes, unknown entities and bytes that are
+// not UTF-8. What comes from a network is therefore checked here first. Two passes over the bytes, and still
+// two to four times as fast on requests as a parser that checks by itself.
+
 /// One pass over the markup of a document whose characters have been checked.
 class Scanner {
   public:
@@ -82,6 +86,7 @@ class Scanner {
 
     bool skipBlanks() { return !until(m_rest.find_first_not_of(kBlanks)).empty(); }
 
+    /// The five letters alone do not make a declaration: "<?xml-stylesheet" begins with them, too.
     void declaration() {
         if (!m_rest.starts_with("<?xml") || m_rest.size() < 6 || !isBlank(m_rest[5])) return;
         accept("<?xml");
@@ -105,6 +110,7 @@ class Scanner {
             if (m_open.empty()) refuse("text outside the root element");
             through("]]>", "a CDATA section");
         } else if (accept("<!")) {
+            // Entities defined in one are how a small document becomes a huge one.
             refuse("a document type is not accepted");
         } else if (accept("<?")) {
             if (m_rest.starts_with("xml")) refuse("an XML declaration in the middle");
@@ -153,6 +159,7 @@ class Scanner {
             if (!accept("=")) refuse("an attribute has no value");
             skipBlanks();
             attribute.value = quoted();
+            // At most 32 of them, so looking at all of the others stays cheap.
             const auto end = m_attributes.begin() + static_cast<std::ptrdiff_t>(m_count);
             if (std::any_of(m_attributes.begin(), end,
                             [&](const Attribute& other) { return other.name == attribute.name; })) {
@@ -172,6 +179,7 @@ class Scanner {
     }
 
     void checkText(std::string_view text) {
+        // Around the root element only blanks may stand.
         if (m_open.empty()) {
             if (text.find_first_not_of(kBlanks) != std::string_view::npos) {
                 refuse("text outside the root element");
@@ -205,6 +213,7 @@ class Scanner {
         char32_t character = 0;
         for (const char digit : name) {
             const int value = digitValue(digit, hexadecimal);
+            // Left as soon as it is too large, before it can wrap around.
             if (value < 0 || character > 0x10FFFF) return false;
             character = character * (hexadecimal ? 16 : 10) + static_cast<char32_t>(value);
         }

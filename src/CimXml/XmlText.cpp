@@ -6,6 +6,8 @@ namespace cimxml {
 
 namespace {
 
+/// What a byte means for escaping. One look-up a byte keeps long texts, most of them plain, as fast as a
+/// copy.
 enum class ByteKind : unsigned char { Plain, Special, Forbidden, Multi };
 
 constexpr std::array<ByteKind, 256> makeKinds() {
@@ -31,6 +33,7 @@ ByteKind kindOf(char byte) {
     return kKinds[static_cast<unsigned char>(byte)];
 }
 
+/// By the lead byte; C0, C1 and F5 to FF lead no sequence of shortest form (RFC 3629 3).
 std::size_t sequenceLength(unsigned char lead) {
     if (lead < 0x80) return 1;
     if (lead >= 0xC2 && lead < 0xE0) return 2;
@@ -108,12 +111,14 @@ void appendEscaped(std::string& out, std::string_view text) {
                 out.append(entityOf(text[0]));
                 break;
             case ByteKind::Forbidden:
+                // A character reference to it would be just as ill-formed, so it has to go.
                 break;
             case ByteKind::Multi:
                 if (const std::size_t known = xmlCharacterLength(text); known != 0) {
                     length = known;
                     out.append(text.substr(0, length));
                 } else {
+                    // Visible, unlike a byte that is dropped: whoever reads it sees that something was there.
                     out.append("\xEF\xBF\xBD");
                 }
                 break;

@@ -82,8 +82,8 @@ cimxml::Response RemoteManagement::send(cimxml::Request request, const std::stri
     requireOk(reply);
     try {
         cimxml::Response response = cimxml::readResponse(reply.body);
-        if (const auto* failure = std::get_if<cimxml::Failure>(&response.content)) {
-            throw core::CimError(failure->status, failure->description);
+        if (const auto* error = std::get_if<cimxml::ErrorResult>(&response.content)) {
+            throw core::CimError(error->status, error->description);
         }
         return response;
     } catch (const cimxml::WireError& error) {
@@ -153,8 +153,8 @@ core::MethodResult RemoteManagement::invokeMethod(const core::CimPath& path, con
     cimxml::Request request;
     request.call = std::move(call);
     cimxml::Response response = send(std::move(request), object.toString());
-    auto* result = std::get_if<cimxml::ExtrinsicResult>(&response.content);
-    return result == nullptr ? core::MethodResult{} : std::move(result->result);
+    auto* result = std::get_if<core::MethodResult>(&response.content);
+    return result == nullptr ? core::MethodResult{} : std::move(*result);
 }
 
 void RemoteManagement::deleteInstance(const core::CimPath& path) {

@@ -30,7 +30,8 @@ void checkResponse(std::string_view bytes) {
 
 /// Whatever a provider says, the answer is well-formed.
 void checkText(const std::string& text) {
-    const cimxml::Response response{text, text, true, text, cimxml::Failure{core::CimStatus::Failed, text}};
+    const cimxml::Response response{text, text, true, text,
+                                    cimxml::ErrorResult{core::CimStatus::Failed, text}};
     cimxml::readResponse(cimxml::writeResponse(response));
 }
 

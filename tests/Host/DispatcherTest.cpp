@@ -52,7 +52,7 @@ class DispatcherTest : public ::testing::Test {
     }
 
     static int statusIn(const cimxml::Response& response) {
-        const auto* failure = std::get_if<cimxml::Failure>(&response.content);
+        const auto* failure = std::get_if<cimxml::ErrorResult>(&response.content);
         if (failure == nullptr) return 0;
         EXPECT_NE(failure->description, "");
         return static_cast<int>(failure->status);
@@ -243,7 +243,7 @@ TEST_F(DispatcherTest, CallsMethods) {
     const cimxml::RawArgument echo{"ECHO", {{}, std::string("given "), false}};
     const cimxml::RawArgument job{"Job", {{}, gadget("b", "2"), false}};
     const cimxml::Response response = invoke(a, "work", {numbers({"5", " 0x10 "}), text, echo, job});
-    const auto& result = std::get<cimxml::ExtrinsicResult>(response.content).result;
+    const auto& result = std::get<core::MethodResult>(response.content);
     EXPECT_EQ(response.name, "work");
     EXPECT_EQ(result.returnValue, 21U);
     EXPECT_EQ(output(result, "Echo"), "given hello");
@@ -286,7 +286,7 @@ TEST_F(DispatcherTest, TakesOnlyArgumentsOfTheDeclaredKind) {
     // The provider says what is missing, in its own words; its own failures are none of the client's.
     const cimxml::Response missing = workOn({});
     EXPECT_EQ(statusIn(missing), 4);
-    EXPECT_EQ(std::get<cimxml::Failure>(missing.content).description,
+    EXPECT_EQ(std::get<cimxml::ErrorResult>(missing.content).description,
               "SMASHv2:EUnspecifiedError:Text is missing");
     EXPECT_EQ(statusIn(invoke(a, "Work", {})), 4);
     EXPECT_EQ(statusIn(workOn({{}, std::string("fail"), false})), 1);

@@ -8,8 +8,7 @@ namespace host {
 
 namespace {
 
-using cimxml::ExtrinsicResult;
-using cimxml::Failure;
+using cimxml::ErrorResult;
 using cimxml::IntrinsicResult;
 using core::CimError;
 using core::CimStatus;
@@ -59,14 +58,13 @@ IntrinsicResult Dispatcher::call(const cimxml::IntrinsicCall& call, const Caller
                               Parameters(call, operation->parameters));
 }
 
-ExtrinsicResult Dispatcher::call(const cimxml::MethodCall& call, const Caller& caller) {
+core::MethodResult Dispatcher::call(const cimxml::MethodCall& call, const Caller& caller) {
     requirePrivilege(methodPrivilege(), caller);
     core::CimOperations& target = findNamespace(call.object.getNamespace());
     std::vector<core::Argument> arguments;
     for (const cimxml::RawArgument& each : call.arguments)
         arguments.push_back(argumentOf(each));
-    core::MethodResult result = target.invokeMethod(call.object, call.method, arguments);
-    return {result.returnType, std::move(result)};
+    return target.invokeMethod(call.object, call.method, arguments);
 }
 
 cimxml::Response Dispatcher::dispatch(const cimxml::Request& request, const Caller& caller) {
@@ -85,11 +83,11 @@ cimxml::Response Dispatcher::dispatch(const cimxml::Request& request, const Call
             response.content = call(std::get<cimxml::IntrinsicCall>(request.call), caller);
         }
     } catch (const CimError& error) {
-        response.content = Failure{error.status(), error.what()};
+        response.content = ErrorResult{error.status(), error.what()};
     } catch (const std::bad_alloc&) {
-        response.content = Failure{CimStatus::Failed, "out of memory"};
+        response.content = ErrorResult{CimStatus::Failed, "out of memory"};
     } catch (const std::exception& error) {
-        response.content = Failure{CimStatus::Failed, error.what()};
+        response.content = ErrorResult{CimStatus::Failed, error.what()};
     }
     return response;
 }

@@ -25,7 +25,7 @@ class Dispatcher {
 
   private:
     cimxml::IntrinsicResult call(const cimxml::IntrinsicCall& call, const Caller& caller);
-    cimxml::ExtrinsicResult call(const cimxml::MethodCall& call, const Caller& caller);
+    core::MethodResult call(const cimxml::MethodCall& call, const Caller& caller);
     core::CimOperations& findNamespace(const std::string& name) const;
 
     const Namespaces m_namespaces;
