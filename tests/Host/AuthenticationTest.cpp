@@ -9,7 +9,6 @@
 #include <ctime>
 #include <thread>
 
-#include "Host/Authentication/PamChecker.h"
 #include "Host/Authentication/UsersFile.h"
 #include "Support/TempFolder.h"
 
@@ -18,7 +17,7 @@ namespace {
 using namespace std::chrono_literals;
 using host::AuthenticationOutcome;
 using host::Credentials;
-using host::Identity;
+using host::User;
 
 TEST(UsersFileTest, ChecksPasswords) {
     const test::TempFolder folder;
@@ -88,14 +87,14 @@ TEST(UsersFileTest, SaysWhatIsWrongWithAFile) {
 }
 
 TEST(PamCheckerTest, KnowsWhoMayDoWhat) {
-    EXPECT_TRUE(host::identityOf("root", {}).isAdministrator);
-    EXPECT_FALSE(host::identityOf("nobody", {}).mayRead);
+    EXPECT_TRUE(host::systemUser("root", {}).isAdministrator);
+    EXPECT_FALSE(host::systemUser("nobody", {}).mayRead);
     for (const char* reader : {"nobody", "*", "@nogroup"}) {
-        const Identity identity = host::identityOf("nobody", {"somebody", reader});
-        EXPECT_TRUE(identity.mayRead && !identity.isAdministrator) << reader;
+        const User user = host::systemUser("nobody", {"somebody", reader});
+        EXPECT_TRUE(user.mayRead && !user.isAdministrator) << reader;
     }
-    EXPECT_FALSE(host::identityOf("nobody", {"@root", "@no-such-group"}).mayRead);
-    EXPECT_FALSE(host::identityOf("no-such-user", {"*"}).mayRead);
+    EXPECT_FALSE(host::systemUser("nobody", {"@root", "@no-such-group"}).mayRead);
+    EXPECT_FALSE(host::systemUser("no-such-user", {"*"}).mayRead);
     EXPECT_FALSE(host::PamChecker({"*"}).check({"no-such-user", "secret"}, "127.0.0.1"));
 }
 
@@ -131,10 +130,10 @@ TEST(FailureDelaysTest, GrowWithFailures) {
 class CountingChecker : public host::PasswordChecker {
   public:
     explicit CountingChecker(std::atomic<int>& asked) : m_asked(asked) {}
-    std::optional<Identity> check(const Credentials& credentials, const std::string&) override {
+    std::optional<User> check(const Credentials& credentials, const std::string&) override {
         ++m_asked;
         if (credentials.password != "\xC3\xBC:x") return std::nullopt;
-        return Identity{credentials.user, false, credentials.user != "stranger"};
+        return User{credentials.user, false, credentials.user != "stranger"};
     }
 
   private:

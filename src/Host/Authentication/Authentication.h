@@ -2,12 +2,13 @@
 
 #include <memory>
 #include <optional>
+#include <stop_token>
 #include <string>
 
 #include "Host/Authentication/CredentialCache.h"
 #include "Host/Authentication/FailureDelays.h"
 #include "Host/Authentication/PasswordChecker.h"
-#include "Host/Server/Slots.h"
+#include "Host/Slots.h"
 
 namespace host {
 
@@ -21,7 +22,7 @@ enum class AuthenticationOutcome {
 
 struct AuthenticationResult {
     AuthenticationOutcome outcome = AuthenticationOutcome::Missing;
-    Identity identity;
+    User user;
 };
 
 /// Who sends a request. Credentials verified a short while ago are accepted at once; others are checked, a
@@ -42,13 +43,13 @@ class Authentication {
 
   private:
     bool waitForTurn(const std::string& address);
-    std::optional<Identity> checkNow(const Credentials& credentials, const std::string& address);
+    std::optional<User> checkNow(const Credentials& credentials, const std::string& address);
 
     std::unique_ptr<PasswordChecker> m_checker;
     CredentialCache m_cache;
     FailureDelays m_delays;
     Slots m_checks;
-    StopSignal m_stop;
+    std::stop_source m_stop;
 };
 
 }  // namespace host

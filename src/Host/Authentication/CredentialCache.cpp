@@ -48,11 +48,11 @@ CredentialCache::Digest CredentialCache::digestOf(const Credentials& credentials
     return digest;
 }
 
-std::optional<Identity> CredentialCache::find(const Credentials& credentials, const std::string& place) {
+std::optional<User> CredentialCache::find(const Credentials& credentials, const std::string& place) {
     const utils::Mutex::AutoLocker lock(m_mutex);
     const auto found = m_entries.find(digestOf(credentials, place));
     if (found == m_entries.end() || found->second.expires <= Clock::now()) return std::nullopt;
-    return found->second.identity;
+    return found->second.user;
 }
 
 bool CredentialCache::knows(const Credentials& credentials, const std::string& place) {
@@ -60,16 +60,18 @@ bool CredentialCache::knows(const Credentials& credentials, const std::string& p
     return m_entries.contains(digestOf(credentials, place));
 }
 
-void CredentialCache::remember(const Credentials& credentials, const std::string& place,
-                               const Identity& identity, std::uint64_t generation) {
+void CredentialCache::remember(const Credentials& credentials, const std::string& place, const User& user,
+                               std::uint64_t generation) {
     const utils::Mutex::AutoLocker lock(m_mutex);
+    // The users were read again while this password was checked: it may be wrong by now.
     if (generation != m_generation) return;
+    // A linear search for the oldest is rare and short; an order of its own would cost with every look-up.
     if (m_entries.size() >= kMostEntries) {
         m_entries.erase(std::min_element(
             m_entries.begin(), m_entries.end(),
             [](const auto& a, const auto& b) { return a.second.expires < b.second.expires; }));
     }
-    m_entries[digestOf(credentials, place)] = {identity, Clock::now() + m_rememberFor};
+    m_entries[digestOf(credentials, place)] = {user, Clock::now() + m_rememberFor};
 }
 
 void CredentialCache::forget(const Credentials& credentials, const std::string& place) {

@@ -6,7 +6,7 @@
 #include <map>
 #include <optional>
 
-#include "Host/Authentication/Identity.h"
+#include "Host/Authentication/PasswordChecker.h"
 #include "Utils/Os/Linux/Thread.h"
 #include "Utils/ThreadAnnotations.h"
 
@@ -23,13 +23,13 @@ class CredentialCache {
     explicit CredentialCache(std::chrono::seconds rememberFor);
 
     /// Nothing when they were never right, or too long ago.
-    std::optional<Identity> find(const Credentials& credentials, const std::string& place);
+    std::optional<User> find(const Credentials& credentials, const std::string& place);
     /// Whether they were right once.
     bool knows(const Credentials& credentials, const std::string& place);
     /// How often everything was forgotten. To be asked before a check whose outcome is remembered: what was
     /// found right by users that have been read anew since is not remembered.
     std::uint64_t generation();
-    void remember(const Credentials& credentials, const std::string& place, const Identity& identity,
+    void remember(const Credentials& credentials, const std::string& place, const User& user,
                   std::uint64_t generation);
     void forget(const Credentials& credentials, const std::string& place);
     /// Forgets everything and takes a new key.
@@ -39,7 +39,7 @@ class CredentialCache {
     using Clock = std::chrono::steady_clock;
     using Digest = std::array<unsigned char, 32>;
     struct Entry {
-        Identity identity;
+        User user;
         Clock::time_point expires;
     };
 

@@ -22,6 +22,7 @@ constexpr minutes kForgetAfter{15};
 }  // namespace
 
 std::string FailureDelays::keyOf(const std::string& address) {
+    // One host has 2^64 addresses of its network to guess from.
     std::array<char, sizeof(in6_addr)> bytes{};
     if (::inet_pton(AF_INET6, address.c_str(), bytes.data()) != 1) return address;
     return {bytes.data(), 8};
@@ -38,6 +39,7 @@ std::optional<FailureDelays::Clock::time_point> FailureDelays::admit(const std::
     if (found == m_records.end()) return now;
     Record& record = found->second;
     const Clock::time_point turn = std::max(now, record.next);
+    // Each that waits holds a connection's thread, so a queue may not grow without end.
     if (turn - now > kLongestWait) return std::nullopt;
     record.next = turn + delayAfter(record.failures);
     return turn;
@@ -46,6 +48,7 @@ std::optional<FailureDelays::Clock::time_point> FailureDelays::admit(const std::
 void FailureDelays::failed(const std::string& address, Clock::time_point now) {
     const utils::Mutex::AutoLocker lock(m_mutex);
     std::erase_if(m_records, [&](const auto& each) { return now - each.second.last > kForgetAfter; });
+    // An attacker with many addresses must not cost memory; the one quiet for longest matters least.
     if (m_records.size() >= kMostRecords) {
         m_records.erase(
             std::min_element(m_records.begin(), m_records.end(),

@@ -1,5 +1,3 @@
-#include "Host/Authentication/PamChecker.h"
-
 #include <grp.h>
 #include <pwd.h>
 #include <security/pam_appl.h>
@@ -8,6 +6,8 @@
 #include <array>
 #include <cstdlib>
 #include <cstring>
+
+#include "Host/Authentication/PasswordChecker.h"
 
 namespace host {
 
@@ -23,6 +23,7 @@ int converse(int count, const pam_message** messages, pam_response** responses, 
         static_cast<pam_response*>(std::calloc(static_cast<std::size_t>(count), sizeof(pam_response)));
     if (answers == nullptr) return PAM_BUF_ERR;
     for (int i = 0; i < count; ++i) {
+        // A module may ask for more than a password, such as a code; without an answer it refuses.
         if (messages[i]->msg_style == PAM_PROMPT_ECHO_OFF) {
             answers[i].resp = ::strdup(static_cast<const Credentials*>(data)->password.c_str());
         }
@@ -40,6 +41,7 @@ class PamSession {
         : m_conversation{converse, const_cast<Credentials*>(&credentials)} {
         m_status = ::pam_start(kService, credentials.user.c_str(), &m_conversation, &m_handle);
         if (m_status != PAM_SUCCESS) return;
+        // For the logs, and for modules that lock an address out.
         ::pam_set_item(m_handle, PAM_RHOST, address.c_str());
         void (*delay)(int, unsigned int, void*) = noDelay;
         ::pam_set_item(m_handle, PAM_FAIL_DELAY, reinterpret_cast<const void*>(delay));
@@ -53,6 +55,7 @@ class PamSession {
     bool authenticate() {
         constexpr int kFlags = PAM_SILENT | PAM_DISALLOW_NULL_AUTHTOK;
         if (m_status == PAM_SUCCESS) m_status = ::pam_authenticate(m_handle, kFlags);
+        // The password may be right and the account expired or locked all the same.
         if (m_status == PAM_SUCCESS) m_status = ::pam_acct_mgmt(m_handle, kFlags);
         return m_status == PAM_SUCCESS;
     }
@@ -73,6 +76,7 @@ Account findAccount(const std::string& user) {
     passwd entry{};
     passwd* found = nullptr;
     std::array<char, 16384> buffer{};
+    // Not getpwnam(): requests are served on many threads.
     if (::getpwnam_r(user.c_str(), &entry, buffer.data(), buffer.size(), &found) != 0 || found == nullptr) {
         return {};
     }
@@ -82,6 +86,7 @@ Account findAccount(const std::string& user) {
 std::vector<gid_t> groupsOf(const std::string& user, gid_t first) {
     int count = 64;
     std::vector<gid_t> groups(static_cast<std::size_t>(count));
+    // It says how many there are when the list is too short.
     if (::getgrouplist(user.c_str(), first, groups.data(), &count) < 0) {
         groups.resize(static_cast<std::size_t>(count));
         ::getgrouplist(user.c_str(), first, groups.data(), &count);
@@ -102,23 +107,23 @@ bool isMember(const std::vector<gid_t>& groups, const std::string& group) {
 
 }  // namespace
 
-Identity identityOf(const std::string& user, const std::vector<std::string>& readers) {
-    Identity identity{user, false, false};
-    const Account account = findAccount(user);
-    if (!account.known) return identity;
-    const std::vector<gid_t> groups = groupsOf(user, account.gid);
-    identity.isAdministrator = account.uid == 0 || isMember(groups, kAdministrators);
-    identity.mayRead = identity.isAdministrator ||
-                       std::any_of(readers.begin(), readers.end(), [&](const std::string& reader) {
-                           if (reader.starts_with('@')) return isMember(groups, reader.substr(1));
-                           return reader == "*" || reader == user;
-                       });
-    return identity;
+User systemUser(const std::string& name, const std::vector<std::string>& readers) {
+    User user{name, false, false};
+    const Account account = findAccount(name);
+    if (!account.known) return user;
+    const std::vector<gid_t> groups = groupsOf(name, account.gid);
+    user.isAdministrator = account.uid == 0 || isMember(groups, kAdministrators);
+    user.mayRead =
+        user.isAdministrator || std::any_of(readers.begin(), readers.end(), [&](const std::string& reader) {
+            if (reader.starts_with('@')) return isMember(groups, reader.substr(1));
+            return reader == "*" || reader == name;
+        });
+    return user;
 }
 
-std::optional<Identity> PamChecker::check(const Credentials& credentials, const std::string& address) {
+std::optional<User> PamChecker::check(const Credentials& credentials, const std::string& address) {
     if (!PamSession(credentials, address).authenticate()) return std::nullopt;
-    return identityOf(credentials.user, m_readers);
+    return systemUser(credentials.user, m_readers);
 }
 
 }  // namespace host

@@ -2,6 +2,8 @@
 
 #include <crypt.h>
 #include <fcntl.h>
+#include <gnutls/crypto.h>
+#include <gnutls/gnutls.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
@@ -28,15 +30,11 @@ namespace {
 
 /// Equal without telling by the time it takes where the difference is.
 bool sameHash(std::string_view left, std::string_view right) {
-    int difference = left.size() == right.size() ? 0 : 1;
-    for (std::size_t i = 0; i < std::min(left.size(), right.size()); ++i) {
-        difference |= left[i] ^ right[i];
-    }
-    return difference == 0;
+    return left.size() == right.size() && ::gnutls_memcmp(left.data(), right.data(), left.size()) == 0;
 }
 
 std::string crypted(const std::string& password, const std::string& setting) {
-    const auto data = std::make_unique<crypt_data>();
+    const auto data = std::make_unique<crypt_data>();  // 32 KiB: too much for the stack of a thread
     const char* hash = ::crypt_r(password.c_str(), setting.c_str(), data.get());
     // A failure token begins with an asterisk and equals no hash.
     return hash == nullptr ? "*" : hash;
@@ -107,6 +105,7 @@ void writeUsersFile(const std::string& path, const UserEntries& users) {
     }
     std::error_code error;
     std::filesystem::create_directories(std::filesystem::path(path).parent_path(), error);
+    // Written beside and renamed over it, so that a reader finds the old file or the new one, never half.
     const std::string fresh = path + ".new";
     ::unlink(fresh.c_str());
     const int fd = ::open(fresh.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0600);
@@ -149,12 +148,13 @@ UserEntry UsersFile::find(const std::string& name, bool& known) {
     return known ? found->second : UserEntry{m_decoy, false};
 }
 
-std::optional<Identity> UsersFile::check(const Credentials& credentials, const std::string&) {
+std::optional<User> UsersFile::check(const Credentials& credentials, const std::string&) {
     bool known = false;
     const UserEntry entry = find(credentials.user, known);
+    // The hash of an unknown user is checked as well: a fast answer would tell who exists.
     const bool right = sameHash(crypted(credentials.password, entry.hash), entry.hash);
     if (!known || !right) return std::nullopt;
-    return Identity{credentials.user, entry.isAdministrator, true};
+    return User{credentials.user, entry.isAdministrator, true};
 }
 
 }  // namespace host

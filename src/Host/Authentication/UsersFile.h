@@ -38,7 +38,7 @@ class UsersFile : public PasswordChecker {
   public:
     explicit UsersFile(std::string path);
 
-    std::optional<Identity> check(const Credentials& credentials, const std::string& address) override;
+    std::optional<User> check(const Credentials& credentials, const std::string& address) override;
     void reload() override;
 
   private:

@@ -1,12 +1,15 @@
 #include "Host/Daemon/Daemon.h"
 
 #include "Framework/Classes/InstanceReaper.h"
-#include "Host/Authentication/PamChecker.h"
+#include "Host/Authentication/Authentication.h"
 #include "Host/Authentication/UsersFile.h"
 #include "Host/Daemon/Providers.h"
 #include "Host/Daemon/Report.h"
 #include "Host/Daemon/RunningJobs.h"
+#include "Host/Operations/Dispatcher.h"
 #include "Host/Operations/InteropNamespace.h"
+#include "Host/Server/Listener.h"
+#include "Host/Server/TlsIdentity.h"
 #include "MidAPI/ma.h"
 #include "Utils/Os/Linux/linux.h"
 

@@ -6,6 +6,7 @@ namespace host {
 
 namespace {
 
+// Limits are whole seconds, so looking four times a second is exact enough and needs no queue of deadlines.
 constexpr std::chrono::milliseconds kTick{250};
 
 /// The connection's own thread sees the end and closes; closing here would let the number be used again.
@@ -14,17 +15,6 @@ void end(int socket) {
 }
 
 }  // namespace
-
-ConnectionWatch::ConnectionWatch() : m_thread([this] { run(); }) {}
-
-ConnectionWatch::~ConnectionWatch() {
-    {
-        const std::lock_guard lock(m_mutex);
-        m_stopped = true;
-        m_changed.notify_all();
-    }
-    m_thread.join();
-}
 
 void ConnectionWatch::opened(int socket, Clock::duration allowed) {
     const std::lock_guard lock(m_mutex);
@@ -39,7 +29,7 @@ void ConnectionWatch::closed(int socket) {
 void ConnectionWatch::set(int socket, const Watched& watched) {
     const std::lock_guard lock(m_mutex);
     const auto found = m_watched.find(socket);
-    if (found == m_watched.end()) return;
+    if (found == m_watched.end()) return;  // closed meanwhile; the number may be another connection's soon
     found->second = watched;
     if (m_ending && watched.isIdle) end(socket);
 }
@@ -58,16 +48,17 @@ void ConnectionWatch::idle(int socket, Clock::duration allowed) {
 
 void ConnectionWatch::endIdle() {
     const std::lock_guard lock(m_mutex);
+    // Those at work end by themselves: their answers carry "Connection: close".
     m_ending = true;
     for (const auto& [socket, watched] : m_watched) {
         if (watched.isIdle) end(socket);
     }
 }
 
-void ConnectionWatch::run() {
+void ConnectionWatch::run(const std::stop_token& stop) {
     std::unique_lock lock(m_mutex);
-    while (!m_stopped) {
-        m_changed.wait_for(lock, kTick);
+    while (!stop.stop_requested()) {
+        m_stopped.wait_for(lock, stop, kTick, [] { return false; });
         const auto now = Clock::now();
         for (const auto& [socket, watched] : m_watched) {
             if (watched.deadline <= now) end(socket);

@@ -4,6 +4,7 @@
 #include <condition_variable>
 #include <map>
 #include <mutex>
+#include <stop_token>
 #include <thread>
 
 namespace host {
@@ -15,9 +16,8 @@ class ConnectionWatch {
   public:
     using Clock = std::chrono::steady_clock;
 
-    ConnectionWatch();
-    /// No connection may be left.
-    ~ConnectionWatch();
+    /// No connection may be left at its end.
+    ConnectionWatch() = default;
     ConnectionWatch(const ConnectionWatch&) = delete;
     ConnectionWatch& operator=(const ConnectionWatch&) = delete;
 
@@ -42,14 +42,13 @@ class ConnectionWatch {
     };
 
     void set(int socket, const Watched& watched);
-    void run();
+    void run(const std::stop_token& stop);
 
     std::mutex m_mutex;
-    std::condition_variable m_changed;
+    std::condition_variable_any m_stopped;
     std::map<int, Watched> m_watched;
     bool m_ending = false;
-    bool m_stopped = false;
-    std::thread m_thread;
+    std::jthread m_thread{[this](const std::stop_token& stop) { run(stop); }};  // last: it uses the others
 };
 
 }  // namespace host

@@ -7,6 +7,7 @@
 #include <vector>
 
 #include "CimXml/Request.h"
+#include "CimXml/WireError.h"
 
 namespace host {
 
@@ -17,8 +18,9 @@ struct HttpHead {
     std::string host;     ///< header Host
     std::optional<std::string> authorization;
     std::optional<std::string> contentType;
-    std::optional<std::string> contentLength;
-    bool chunked = false;
+    std::optional<std::string> contentEncoding;
+    std::vector<std::string> contentLengths;  ///< more than one where the client repeats the header
+    bool isChunked = false;
     cimxml::RequestHeaders cim;
 };
 
@@ -27,14 +29,19 @@ struct HttpAnswer {
     std::vector<std::pair<std::string, std::string>> headers;
     std::string body;
 
-    /// One without a body.
+    /// Without a body, here and below.
     static HttpAnswer plain(unsigned int status) { return {status, {}, ""}; }
     static HttpAnswer withHeader(unsigned int status, std::string name, std::string value) {
         return {status, {{std::move(name), std::move(value)}}, ""};
     }
+    static HttpAnswer refusal(const cimxml::WireError& error);
 };
 
-/// The announced length of the body; nothing for a header that is no number.
+/// The announced length of the body; nothing when no header says it in one number, or two differ.
 std::optional<std::uint64_t> contentLengthOf(const HttpHead& head);
+
+/// What the head of a request alone is refused for: method, length, encoding, content type, CIM headers.
+/// Nothing when the body may be read.
+std::optional<HttpAnswer> checkHead(const HttpHead& head, std::size_t bodyLimit);
 
 }  // namespace host

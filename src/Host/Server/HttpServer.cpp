@@ -7,7 +7,11 @@
 #include <cstdio>
 #include <stdexcept>
 
-#include "Host/Server/Exchange.h"
+#include "Host/Authentication/Authentication.h"
+#include "Host/Server/ConnectionWatch.h"
+#include "Host/Server/HttpRequest.h"
+#include "Host/Server/Listener.h"
+#include "Host/Server/TlsIdentity.h"
 #include "Utils/Log.h"
 
 namespace host {
@@ -19,10 +23,11 @@ constexpr const char* kTlsPriorities = "NORMAL:-VERS-ALL:+VERS-TLS1.3:+VERS-TLS1
 /// What the function below shows; old ones live as long as their server.
 std::atomic<const TlsIdentity*> currentIdentity{nullptr};
 
+/// GnuTLS asks for each handshake, so a certificate that was renewed is shown without a restart.
 int retrieveCertificate(gnutls_session_t, const gnutls_datum_t*, int, const gnutls_pk_algorithm_t*, int,
                         gnutls_pcert_st** certificates, unsigned int* count, gnutls_privkey_t* key) {
     const TlsIdentity* identity = currentIdentity.load();
-    if (identity == nullptr) return -1;
+    if (identity == nullptr) return -1;  // the handshake fails, the server goes on
     *certificates = identity->certificates();
     *count = identity->certificateCount();
     *key = identity->key();
@@ -48,14 +53,14 @@ struct HttpServer::Callbacks {
                               const char*, const char* data, std::size_t* size, void** state) {
         try {
             if (*state == nullptr) {
-                auto exchange =
-                    std::make_unique<Exchange>(*static_cast<HttpServer*>(server), connection, method);
-                *state = exchange.get();
-                return exchange.release()->begin();
+                auto made =
+                    std::make_unique<HttpRequest>(*static_cast<HttpServer*>(server), connection, method);
+                *state = made.get();
+                return made.release()->begin();
             }
-            auto& exchange = *static_cast<Exchange*>(*state);
-            if (*size == 0) return exchange.finish();
-            exchange.take(data, *size);
+            auto& request = *static_cast<HttpRequest*>(*state);
+            if (*size == 0) return request.finish();
+            request.take(data, *size);
             *size = 0;
             return MHD_YES;
         } catch (const std::exception& error) {
@@ -67,9 +72,9 @@ struct HttpServer::Callbacks {
     static void completed(void* server, MHD_Connection* connection, void** state,
                           MHD_RequestTerminationCode code) {
         auto& self = *static_cast<HttpServer*>(server);
-        const std::unique_ptr<Exchange> exchange(static_cast<Exchange*>(*state));
+        const std::unique_ptr<HttpRequest> request(static_cast<HttpRequest*>(*state));
         *state = nullptr;
-        if (exchange && code == MHD_REQUEST_TERMINATED_COMPLETED_OK) exchange->drain();
+        if (request && code == MHD_REQUEST_TERMINATED_COMPLETED_OK) request->drain();
         self.m_watch->idle(socketOf(connection), self.m_limits.idleTime + self.m_limits.headerTime);
     }
 
@@ -88,7 +93,7 @@ HttpServer::HttpServer(const ServerLimits& limits, Dispatcher& dispatcher, Authe
     : m_limits(limits),
       m_dispatcher(dispatcher),
       m_authentication(authentication),
-      m_workers(limits.workers),
+      m_workers(static_cast<std::ptrdiff_t>(limits.workers)),
       m_watch(std::make_unique<ConnectionWatch>()) {}
 
 HttpServer::~HttpServer() {
@@ -133,13 +138,14 @@ void HttpServer::stopAccepting() {
     m_stopping.store(true);
     for (MHD_Daemon* daemon : m_daemons) {
         const int socket = ::MHD_quiesce_daemon(daemon);
-        if (socket >= 0) ::close(socket);
+        if (socket >= 0) ::close(socket);  // from now on a client is refused at once, not left waiting
     }
     m_watch->endIdle();
 }
 
 void HttpServer::close() {
     if (!m_stopping.load()) stopAccepting();
+    // The library waits for its threads, and some of them may sit out the delay after a wrong password.
     m_authentication.stop();
     for (MHD_Daemon* daemon : m_daemons)
         ::MHD_stop_daemon(daemon);

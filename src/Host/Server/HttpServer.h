@@ -5,12 +5,8 @@
 #include <string>
 #include <vector>
 
-#include "Host/Authentication/Authentication.h"
-#include "Host/Operations/Dispatcher.h"
-#include "Host/Server/ConnectionWatch.h"
-#include "Host/Server/Listener.h"
-#include "Host/Server/TlsIdentity.h"
 #include "Host/Settings.h"
+#include "Host/Slots.h"
 
 struct MHD_Connection;
 struct MHD_Daemon;
@@ -18,7 +14,12 @@ struct MHD_Response;
 
 namespace host {
 
-class Exchange;
+class Authentication;
+class ConnectionWatch;
+class Dispatcher;
+class HttpRequest;
+class Listener;
+class TlsIdentity;
 
 /// Serves CIM-XML over HTTP and HTTPS. One thread per connection, and a bounded number of them: a request may
 /// verify an image or ask PAM, and would stall every client of a thread that serves many. One per process,
@@ -42,7 +43,7 @@ class HttpServer {
     unsigned int inFlight() const { return m_inFlight.load(); }
 
   private:
-    friend class Exchange;
+    friend class HttpRequest;
     struct Callbacks;
 
     void close();

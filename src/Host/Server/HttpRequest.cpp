@@ -1,4 +1,4 @@
-#include "Host/Server/Exchange.h"
+#include "Host/Server/HttpRequest.h"
 
 #include <arpa/inet.h>
 #include <netinet/in.h>
@@ -8,8 +8,11 @@
 #include <algorithm>
 #include <array>
 
-#include "Host/Server/CimHandler.h"
-#include "Host/Server/RequestGate.h"
+#include "CimXml/Response.h"
+#include "Host/Authentication/Authentication.h"
+#include "Host/Operations/Dispatcher.h"
+#include "Host/Server/ConnectionWatch.h"
+#include "Host/Server/HttpServer.h"
 #include "Utils/Log.h"
 
 namespace host {
@@ -31,6 +34,13 @@ std::string addressOf(MHD_Connection* connection) {
     return text.data();
 }
 
+/// Adds the header to the lengths, if it is one.
+MHD_Result addContentLength(void* lengths, MHD_ValueKind, const char* name, const char* value) {
+    if (core::sameName(name, "Content-Length"))
+        static_cast<std::vector<std::string>*>(lengths)->emplace_back(value == nullptr ? "" : value);
+    return MHD_YES;
+}
+
 HttpHead readHead(MHD_Connection* connection, const char* method) {
     const auto header = [&](const char* name) -> std::optional<std::string> {
         const char* value = ::MHD_lookup_connection_value(connection, MHD_HEADER_KIND, name);
@@ -42,13 +52,16 @@ HttpHead readHead(MHD_Connection* connection, const char* method) {
     head.host = header("Host").value_or("");
     head.authorization = header("Authorization");
     head.contentType = header("Content-Type");
-    head.contentLength = header("Content-Length");
-    head.chunked = header("Transfer-Encoding").has_value();
-    head.cim = {header("CIMOperation"), header("CIMMethod"), std::nullopt, header("CIMProtocolVersion"),
-                header("CIMBatch").has_value()};
+    head.contentEncoding = header("Content-Encoding");
+    head.isChunked = header("Transfer-Encoding").has_value();
+    head.cim = {header("CIMOperation"), header("CIMMethod"), header("CIMObject"),
+                header("CIMProtocolVersion"), header("CIMBatch").has_value()};
+    ::MHD_get_connection_values(connection, MHD_HEADER_KIND, &addContentLength, &head.contentLengths);
     return head;
 }
 
+/// A 503 in place of a 401 for one who has to wait: clients take a 401 for a wrong password and ask for
+/// another.
 HttpAnswer answerOf(AuthenticationOutcome outcome) {
     switch (outcome) {
         case AuthenticationOutcome::Forbidden:
@@ -60,6 +73,7 @@ HttpAnswer answerOf(AuthenticationOutcome outcome) {
     }
 }
 
+// The HTTP library may send the body after our last function has returned, so it owns it.
 void freeBody(void* body) {
     delete static_cast<std::string*>(body);
 }
@@ -76,7 +90,7 @@ MHD_Response* makeResponse(HttpAnswer& answer) {
 
 }  // namespace
 
-Exchange::Exchange(HttpServer& server, MHD_Connection* connection, const char* method)
+HttpRequest::HttpRequest(HttpServer& server, MHD_Connection* connection, const char* method)
     : m_server(server),
       m_connection(connection),
       m_socket(::MHD_get_connection_info(connection, MHD_CONNECTION_INFO_CONNECTION_FD)->connect_fd),
@@ -84,59 +98,79 @@ Exchange::Exchange(HttpServer& server, MHD_Connection* connection, const char* m
     ++m_server.m_inFlight;
 }
 
-Exchange::~Exchange() {
+HttpRequest::~HttpRequest() {
     --m_server.m_inFlight;
 }
 
-bool Exchange::isBodySmall() const {
+bool HttpRequest::isBodySmall() const {
     const auto length = contentLengthOf(m_head);
-    return !m_head.chunked && length && *length <= m_server.m_limits.anonymousBodyBytes;
+    return !m_head.isChunked && length && *length <= m_server.m_limits.anonymousBodyBytes;
 }
 
-std::optional<HttpAnswer> Exchange::authenticate() {
-    // Waiting for a turn or a password check is the server's affair, not the client's slowness.
+std::optional<HttpAnswer> HttpRequest::authenticate() {
+    // While we wait for a turn or check a password, the client is not the slow one.
     m_server.m_watch->suspend(m_socket);
     AuthenticationResult result =
         m_server.m_authentication.authenticate(m_head.authorization, m_head.address);
     if (result.outcome != AuthenticationOutcome::Accepted) return answerOf(result.outcome);
-    m_identity = std::move(result.identity);
+    m_user = std::move(result.user);
     return std::nullopt;
 }
 
-std::optional<HttpAnswer> Exchange::refusal() {
-    std::optional<HttpAnswer> answer = refuseByHead(m_head, m_server.m_limits.bodyBytes);
+std::optional<HttpAnswer> HttpRequest::refusal() {
+    std::optional<HttpAnswer> answer = checkHead(m_head, m_server.m_limits.bodyBytes);
     return answer ? answer : authenticate();
 }
 
-MHD_Result Exchange::begin() {
+MHD_Result HttpRequest::begin() {
+    // Whoever may not is told before he sends a megabyte.
     m_refusal = refusal();
     m_server.m_watch->allow(m_socket, m_server.m_limits.requestTime);
     if (!m_refusal) {
+        // What is announced may never come, so no more than this is set aside on trust.
         m_body.reserve(std::min<std::size_t>(*contentLengthOf(m_head), std::size_t{1} << 16));
         return MHD_YES;
     }
-    // A small body is read and dropped, and the connection can go on; before a large one, the answer.
+    // After a small body, read and dropped, the connection can go on. A large one is not worth reading: the
+    // answer goes out first.
     if (isBodySmall()) return MHD_YES;
     m_mustDrain = true;
     return queue(std::move(*m_refusal));
 }
 
-void Exchange::take(const char* data, std::size_t size) {
+void HttpRequest::take(const char* data, std::size_t size) {
+    // The library goes on handing over what comes; of a refused body nothing is kept.
     if (!m_refusal) m_body.append(data, size);
 }
 
-HttpAnswer Exchange::carryOut() {
+HttpAnswer HttpRequest::carryOut() {
+    // From here on the time is ours: an operation may read an image of many megabytes.
     m_server.m_watch->suspend(m_socket);
-    const Slots::Use worker(m_server.m_workers, m_server.m_limits.requestTime);
+    const SlotUse worker(m_server.m_workers, m_server.m_limits.requestTime);
     if (!worker) return HttpAnswer::withHeader(503, "Retry-After", "10");
-    return answerBody(m_server.m_dispatcher, m_head, m_identity, m_body);
+    try {
+        const cimxml::Request request = cimxml::readRequest(m_body);
+        cimxml::checkHeadersAgainst(m_head.cim, request);
+        QUENX_DEBUG("%s of %s from %s", request.name().c_str(), m_user.name.c_str(), m_head.address.c_str());
+        // Paths in the answer carry the name by which the client reached us, since it may come back with
+        // them.
+        const Caller caller{m_user.name, m_user.isAdministrator,
+                            m_head.host.empty() ? "localhost" : m_head.host};
+        const cimxml::Response response = m_server.m_dispatcher.dispatch(request, caller);
+        return {200,
+                {{"Content-Type", "application/xml; charset=\"utf-8\""}, {"CIMOperation", "MethodResponse"}},
+                cimxml::writeResponse(response)};
+    } catch (const cimxml::WireError& error) {
+        QUENX_DEBUG("refused a request from %s: %s", m_head.address.c_str(), error.what());
+        return HttpAnswer::refusal(error);
+    }
 }
 
-MHD_Result Exchange::finish() {
+MHD_Result HttpRequest::finish() {
     return queue(m_refusal ? std::move(*m_refusal) : carryOut());
 }
 
-MHD_Result Exchange::queue(HttpAnswer answer) {
+MHD_Result HttpRequest::queue(HttpAnswer answer) {
     const unsigned int status = answer.status;
     MHD_Response* response = makeResponse(answer);
     if (response == nullptr) return MHD_NO;
@@ -150,11 +184,12 @@ MHD_Result Exchange::queue(HttpAnswer answer) {
     return result;
 }
 
-void Exchange::drain() {
+void HttpRequest::drain() {
     if (!m_mustDrain) return;
+    // Closing a socket with unread bytes resets the connection, and the reset may overtake the answer.
     ::shutdown(m_socket, SHUT_WR);
     constexpr int kPatience = 200;  // milliseconds without a byte
-    constexpr int kRounds = 64;
+    constexpr int kRounds = 64;     // a megabyte, then the client has had its chance
     std::array<char, 16384> bytes{};
     for (int round = 0; round < kRounds; ++round) {
         pollfd waiting{m_socket, POLLIN, 0};

@@ -1,8 +1,9 @@
-#include "Host/Server/RequestGate.h"
+#include "Host/Server/HttpMessage.h"
 
+#include <algorithm>
 #include <charconv>
+#include <functional>
 
-#include "CimXml/WireError.h"
 #include "Framework/Model/CimType.h"
 
 namespace host {
@@ -21,6 +22,7 @@ bool isXml(const std::string& contentType) {
     const std::string charset = core::foldName("charset=");
     const std::size_t at = folded.find(charset);
     if (at == std::string::npos) return true;
+    // Some clients write the character set in quotes, and some in capitals.
     std::string name = contentType.substr(at + charset.size());
     std::erase_if(name, [](char c) { return c == '"' || c == ' '; });
     return core::sameName(name, "utf-8") || core::sameName(name, "us-ascii");
@@ -28,29 +30,40 @@ bool isXml(const std::string& contentType) {
 
 }  // namespace
 
+HttpAnswer HttpAnswer::refusal(const cimxml::WireError& error) {
+    return withHeader(static_cast<unsigned int>(cimxml::httpStatus(error.fault())), "CIMError",
+                      cimxml::cimErrorHeader(error.fault()));
+}
+
 std::optional<std::uint64_t> contentLengthOf(const HttpHead& head) {
-    if (!head.contentLength) return std::nullopt;
+    const std::vector<std::string>& texts = head.contentLengths;
+    // Where a proxy and the server believe different lengths, one request hides inside another.
+    if (texts.empty() || std::adjacent_find(texts.begin(), texts.end(), std::not_equal_to<>()) != texts.end())
+        return std::nullopt;
     std::uint64_t length = 0;
-    const char* end = head.contentLength->data() + head.contentLength->size();
-    const auto result = std::from_chars(head.contentLength->data(), end, length);
+    const char* end = texts.front().data() + texts.front().size();
+    const auto result = std::from_chars(texts.front().data(), end, length);
     if (result.ec != std::errc() || result.ptr != end) return std::nullopt;
     return length;
 }
 
-std::optional<HttpAnswer> refuseByHead(const HttpHead& head, std::size_t bodyLimit) {
+std::optional<HttpAnswer> checkHead(const HttpHead& head, std::size_t bodyLimit) {
+    // Cheap checks first, and all of them before the password: they take no memory and tell nothing secret.
     if (head.method == "M-POST") return HttpAnswer::plain(501);
     if (head.method != "POST") return HttpAnswer::withHeader(405, "Allow", "POST");
     // No client of this protocol sends chunks, and with a length the refusal comes before the body.
-    if (head.chunked || !head.contentLength) return HttpAnswer::plain(411);
+    if (head.isChunked || head.contentLengths.empty()) return HttpAnswer::plain(411);
     const std::optional<std::uint64_t> length = contentLengthOf(head);
     if (!length) return HttpAnswer::plain(400);
     if (*length > bodyLimit) return HttpAnswer::plain(413);
+    // Nothing here unpacks a body, and one that is small when packed may be huge.
+    if (head.contentEncoding && !core::sameName(*head.contentEncoding, "identity"))
+        return HttpAnswer::plain(415);
     if (head.contentType && !isXml(*head.contentType)) return HttpAnswer::plain(415);
     try {
         cimxml::checkHeaders(head.cim);
     } catch (const cimxml::WireError& error) {
-        return HttpAnswer::withHeader(static_cast<unsigned int>(cimxml::httpStatus(error.fault())),
-                                      "CIMError", cimxml::cimErrorHeader(error.fault()));
+        return HttpAnswer::refusal(error);
     }
     return std::nullopt;
 }

@@ -2,19 +2,21 @@
 
 #include <microhttpd.h>
 
+#include "Host/Authentication/PasswordChecker.h"
 #include "Host/Server/HttpMessage.h"
-#include "Host/Server/HttpServer.h"
 
 namespace host {
 
-/// One request and its answer, on the thread of its connection. Made when the head is there.
-class Exchange {
+class HttpServer;
+
+/// One request, from its head to its answer, on the thread of its connection.
+class HttpRequest {
   public:
-    Exchange(HttpServer& server, MHD_Connection* connection, const char* method);
+    HttpRequest(HttpServer& server, MHD_Connection* connection, const char* method);
     /// After the answer has gone, or the connection has broken.
-    ~Exchange();
-    Exchange(const Exchange&) = delete;
-    Exchange& operator=(const Exchange&) = delete;
+    ~HttpRequest();
+    HttpRequest(const HttpRequest&) = delete;
+    HttpRequest& operator=(const HttpRequest&) = delete;
 
     /// Looks at the head. With an answer that cannot wait for the body, queues it.
     MHD_Result begin();
@@ -38,7 +40,7 @@ class Exchange {
     MHD_Connection* m_connection;
     int m_socket;
     HttpHead m_head;
-    Identity m_identity;
+    User m_user;
     std::optional<HttpAnswer> m_refusal;  ///< waits for the body to be read
     std::string m_body;
     bool m_mustDrain = false;
