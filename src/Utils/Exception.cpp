@@ -17,6 +17,7 @@ Exception::Exception(const char* format, ...) {
     QUENX_ERROR_TEXT(m_message);
 }
 
+// The prefix tells clients whose message it is; in the log the identity of the lines does.
 Exception::Exception(std::string text) : m_message("SMASHv2:" + text) {
     QUENX_ERROR_TEXT(std::move(text));
 }

@@ -35,6 +35,7 @@ Uri::~Uri() = default;
 
 void Uri::parseUri(std::string text) {
     m_scheme = SupportedURISchemes::Unknown;
+    // Split at every colon, not at the first: whether there is one at all decides about the log line.
     const StringArray pieces = split(text, ':');
     if (pieces.size() < 2) {
         QUENX_DEBUG("Incorrect URI format of '%s'", text.c_str());
@@ -55,6 +56,7 @@ bool Uri::IsUriSupported() const {
 
 bool Uri::IsUriAccesible() const {
     if (!IsUriSupported() || m_scheme != SupportedURISchemes::File) return false;
+    // Opened, not only looked at: a file that the service may not read is not accessible.
     try {
         os::getFileSize(m_sourcePath);
         return true;

@@ -29,6 +29,7 @@ std::string formatStr(const char* format, ...) {
 }
 
 std::string getCurrentTime() {
+    // localtime() has one buffer for all threads.
     const std::time_t now = std::time(nullptr);
     std::tm local{};
     if (localtime_r(&now, &local) == nullptr) return "??:??:??";

@@ -49,6 +49,7 @@ std::string anyMismatch(const PreparationTarget& target, const RomFile& rom) {
 /// The requested types, ascending, each once, without type 0.
 Types normalised(Types types) {
     std::erase(types, utils::FirmwareType{});
+    // Callers pass what clients wrote: any order, doubles included.
     std::sort(types.begin(), types.end());
     types.erase(std::unique(types.begin(), types.end()), types.end());
     return types;
@@ -148,6 +149,7 @@ bool hasOutput(PrepareStatus status) {
            status == PrepareStatus::ImageTypesDiffer;
 }
 
+// The last-image bits move with the choice: a chain must end where the chosen images end.
 std::size_t composeChosen(const Preparation& preparation, std::span<const std::uint8_t> file,
                           std::span<std::uint8_t> output) {
     std::vector<std::span<const std::uint8_t>> images;

@@ -72,6 +72,7 @@ void putDataStructure(std::span<std::uint8_t> image, const NewRomImage& wanted, 
         writeLe16(image, kMadeDeviceList + 2 * index, wanted.furtherDeviceIds[index]);
 }
 
+/// An EFI image keeps its signature where a PC-AT image keeps code and checksum.
 void putEfiHeader(std::span<std::uint8_t> image) {
     writeLe16(image, rom::kHeaderRuntimeUnits, static_cast<std::uint16_t>(image.size() / rom::kBlockSize));
     writeLe32(image, rom::kHeaderEfiSignature, rom::kEfiSignature);
@@ -100,6 +101,8 @@ std::size_t composeOptionRom(std::span<const std::span<const std::uint8_t>> imag
     std::size_t length = 0;
     for (std::size_t index = 0; index < images.size(); ++index) {
         const std::span<const std::uint8_t> source = images[index];
+        // Cut short rather than written beyond the buffer; a caller that kept to the contract never gets
+        // here.
         if (!fitsIn(length, source.size(), output.size())) break;
         const std::span<std::uint8_t> target = output.subspan(length, source.size());
         std::copy(source.begin(), source.end(), target.begin());
@@ -143,6 +146,7 @@ std::vector<std::uint8_t> mergeOptionRoms(std::span<const std::uint8_t> base,
 void setCodeRevision(std::span<std::uint8_t> file, const RomImage& image, std::uint16_t revision) {
     if (!fitsIn(image.offset, image.length, file.size())) return;
     const std::span<std::uint8_t> bytes = file.subspan(image.offset, image.length);
+    // Byte by byte: the field may straddle an odd place, and each byte changes the sum by itself.
     const std::size_t field = image.dataStructure + rom::kPcirCodeRevision;
     const bool hasChecksum = image.codeType == rom::CodeType::PcAt;
     patch(bytes, hasChecksum, field, static_cast<std::uint8_t>(revision & 0xFF));
@@ -156,6 +160,7 @@ std::vector<std::uint8_t> makeRomImage(const NewRomImage& wanted) {
     const bool efi = wanted.type == utils::FirmwareType::UEFI;
     writeLe16(image, 0, rom::kSignature);
     writeLe16(image, rom::kHeaderDataStructure, kMadeDataStructure);
+    // A machine that boots from this image calls its code, and gets control back at once.
     image[kMadeCode] = kFarReturn;
     putDataStructure(image, wanted, efi);
     if (efi)

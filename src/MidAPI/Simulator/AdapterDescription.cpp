@@ -37,6 +37,7 @@ constexpr std::array<std::string_view, 5> kActions = {"fail", "throw", "stall", 
 /// Takes hexadecimal digits and then the separator (none when it is NUL) off the front of a text.
 bool takeHex(std::string_view& text, std::size_t fewest, std::size_t most, char separator,
              std::uint32_t& value) {
+    // from_chars() takes neither signs nor blanks nor "0x", so what it takes is digits.
     const char* end = text.data() + std::min(most, text.size());
     const auto result = std::from_chars(text.data(), end, value, 16);
     const auto count = static_cast<std::size_t>(result.ptr - text.data());
@@ -126,6 +127,7 @@ void readIds(const TomlTable& table, PciIds& ids) {
     const std::string id = table.requiredText("pci_id", "1af4:1041");
     if (!parseIds(id, ids.vendor, ids.device))
         table.refuse("pci_id", id, "like \"1af4:1041\" (vendor:device)");
+    // A card without a subsystem of its own repeats its ids there.
     const std::string subsystem = table.text("subsystem_id").value_or(id);
     if (!parseIds(subsystem, ids.subsystemVendor, ids.subsystemDevice))
         table.refuse("subsystem_id", subsystem, "like \"1af4:1100\"");
@@ -207,12 +209,14 @@ std::vector<AdapterDescription> parseAdapterDescriptions(std::string_view text,
 
 std::vector<AdapterDescription> loadAdapterDescriptions(const std::string& path) {
     constexpr std::size_t kMostText = std::size_t{4} * 1024 * 1024;
+    // One byte more tells a file that is too long from one that just fits.
     const auto bytes = readDescriptionFile(path, kMostText + 1);
     if (!bytes) throw AdapterError("there is no adapter description " + path + "; name a readable file");
     if (bytes->size() > kMostText)
         throw AdapterError("the adapter description " + path + " is longer than 4 MiB");
     std::vector<AdapterDescription> adapters =
         parseAdapterDescriptions(std::string(bytes->begin(), bytes->end()), path);
+    // Relative to the description, so that both can be moved together; "/" takes an absolute path as it is.
     const std::filesystem::path folder = std::filesystem::path(path).parent_path();
     for (AdapterDescription& adapter : adapters)
         if (!adapter.flashFile.empty()) adapter.flashFile = (folder / adapter.flashFile).string();

@@ -73,6 +73,7 @@ std::optional<FlashState> decodeFlashState(std::span<const std::uint8_t> bytes) 
     FlashState state;
     state.generation = readLe32(bytes, kGeneration);
     state.activeBank = bytes[kActiveBank];
+    // An intact checksum does not prove that the number is one of ours.
     if (state.activeBank > 1) return {};
     for (std::size_t bank = 0; bank < state.banks.size(); ++bank) {
         state.banks[bank].length = readLe32(bytes, kBanks + bank * kBankLength);
@@ -105,7 +106,8 @@ FlashState FlashStore::state() const {
 std::optional<std::vector<std::uint8_t>> FlashStore::bankContent(const FlashState& state,
                                                                  std::uint8_t bank) const {
     const FlashBank& expected = state.banks[bank];
-    // The file may be longer: an update that was cut off left it so.
+    // The file may be longer: an update that was cut off left it so. The checksum is that of the recorded
+    // length.
     auto bytes = os::readWholeFile(bankPath(bank), expected.length);
     if (bytes && expected.holds(*bytes)) return bytes;
     return std::nullopt;
@@ -159,6 +161,7 @@ void FlashStore::changeState(const std::function<void(FlashState&)>& change) {
 FlashState FlashStore::initialise() {
     makeFolders();
     const os::FileLock lock(path("state.lock"), os::FileLock::Mode::Wait);
+    // Under the lock once more: another process may have been first.
     if (std::optional<FlashState> stored = storedState()) return *stored;
     FlashState state = m_factoryState;
     state.activeBank = 0;

@@ -63,6 +63,7 @@ utils::StringArray Simulator::enumerateAdapters() {
         try {
             FaultRun(adapter->faults(), Operation::Enumerate).reach();
         } catch (const OperationFailure& failure) {
+            // All or none: a list that lacks one port would look as if a card had been pulled out.
             QUENX_ERROR_TEXT(failure.what());
             return {};
         }
@@ -94,6 +95,7 @@ int Simulator::prepareFlashImage(const std::string& adapter, const std::uint8_t*
                                  std::uint8_t* output, std::uint32_t* imageSize,
                                  std::vector<utils::FirmwareType>& types) {
     SimulatedAdapter* found = find(adapter);
+    // An empty file needs no buffers; it is refused with the other files that are not images.
     const bool buffersMissing = fileSize != 0 && (file == nullptr || output == nullptr);
     if (found == nullptr || buffersMissing || imageSize == nullptr || *imageSize < fileSize) {
         QUENX_ERROR("adapter %s: status %d: %s", adapter.c_str(), PrepareStatus::InvalidParameter,

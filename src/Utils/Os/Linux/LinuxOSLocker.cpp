@@ -2,6 +2,7 @@
 
 #include "Utils/Log.h"
 
+// The one instantiation of the process: every library finds the same current locker.
 template class utils::Singleton<os::OSLocker>;
 
 namespace os {
@@ -36,6 +37,7 @@ OSLockerLinux::OSLockerLinux() = default;
 OSLockerLinux::~OSLockerLinux() = default;
 
 int OSLockerLinux::Lock() {
+    // One step: of two callers at once only one may be told that the locker was free.
     return m_busy.exchange(true) ? kBusy : kTaken;
 }
 

@@ -9,6 +9,7 @@ Mutex::~Mutex() {
     pthread_mutex_destroy(&m_mutex);
 }
 
+// The counters order nothing, and must not make a lock dearer.
 void Mutex::Lock() noexcept {
     pthread_mutex_lock(&m_mutex);
     lockCounter.fetch_add(1, std::memory_order_relaxed);

@@ -74,6 +74,7 @@ std::uint32_t SMASHv2Config::getLockerTimeout() {
 bool SMASHv2Config::isDowngradeEnabled() {
     initialize();
     Mutex::AutoLocker locker(m_mutex);
+    // Never cleared: a ban that an edit of the file could lift would not be one.
     for (const std::int32_t value : m_OEMCustomizationValues) {
         if (m_oemCustomization == value) m_downgradeBlocked = true;
     }
@@ -95,6 +96,7 @@ bool SMASHv2Config::getReleaseClaimAfterCheck() {
 void SMASHv2Config::initialize() {
     Mutex::AutoLocker locker(m_mutex);
     try {
+        // Built apart and put in place at the end: a pass that fails leaves the old list whole.
         StringArray directories;
         std::ifstream file(m_path);
         for (std::string line; std::getline(file, line);) {
@@ -110,6 +112,7 @@ void SMASHv2Config::readLine(std::string line, StringArray& directories) {
     // Everywhere, values included: so "Key=value" and "Key = value" read alike.
     replaceCharacter(line, '=', ' ');
     std::istringstream words(line);
+    // A host may have set a locale in which "1.000" is a number.
     words.imbue(std::locale::classic());
     std::string key;
     words >> key;

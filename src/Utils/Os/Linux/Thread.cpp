@@ -36,7 +36,7 @@ void runBody(Thread& thread) {
     try {
         thread.execute();
     } catch (const abi::__forced_unwind&) {
-        throw;  // the end of a thread by pthread_exit
+        throw;  // the end of a thread by pthread_exit; to swallow it would abort the process
     } catch (const std::exception& failure) {
         QUENX_ERROR("Thread %p ended by an exception: %s", address, failure.what());
     } catch (...) {
@@ -65,6 +65,7 @@ void Thread::msleep(unsigned int milliseconds) {
     timespec left{};
     left.tv_sec = static_cast<std::time_t>(milliseconds / 1000);
     left.tv_nsec = static_cast<long>(milliseconds % 1000) * 1000000;
+    // A signal must not shorten a wait: waits pace the polling of devices.
     while (nanosleep(&left, &left) != 0 && errno == EINTR) {
     }
 }
@@ -82,6 +83,7 @@ void Thread::shutdown() noexcept {
     const void* const address = this;
     formatDebugLog(__FILE__, kEndFunction, __LINE__, "Thread::~Thread(%p)", address);
     m_data->stopRequested = true;
+    // The delays give a body time to see the flag, and the log time to tell why a shutdown takes long.
     for (int i = 0; i < kJoinDelays && m_data->inExecute; ++i) {
         formatDebugLog(__FILE__, kEndFunction, __LINE__,
                        "Thread %p is still in 'execute' method. Little delay before join...", address);
@@ -104,6 +106,7 @@ void Thread::join() noexcept {
 
 void* thread_entry(void* argument) {
     Thread& thread = *static_cast<Thread*>(argument);
+    // Kept first: a body may destroy its own thread object, and the flags are written after that.
     const std::shared_ptr<IntThreadData> data = thread.m_data;
     if (data->stopRequested) return nullptr;
     const InExecute inExecute(*data);

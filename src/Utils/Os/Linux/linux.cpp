@@ -87,6 +87,7 @@ std::int32_t getFileSize(const std::string& path) {
     struct stat status {};
     // A path with a NUL in it names nothing, and must not open what its head names.
     if (path.find('\0') != std::string::npos) failToOpen(path);
+    // Told before the opening: to open a device can rewind a tape or reset a modem.
     if (stat(path.c_str(), &status) != 0 || !isReadableKind(status)) failToOpen(path);
     const Descriptor file(openForReading(path));
     // A process without standard input gets number 0 here, and counts as one that cannot open files.
@@ -144,6 +145,7 @@ utils::StringArray listDirectory(const std::string& path) {
         const std::string_view name = entry->d_name;
         if (name != "." && name != "..") names.emplace_back(name);
     }
+    // The system's order changes with every file that comes or goes.
     std::sort(names.begin(), names.end());
     return names;
 }
