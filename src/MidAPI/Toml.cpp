@@ -8,31 +8,41 @@ namespace ma {
 namespace {
 
 constexpr std::string_view kBlanks = " \t\r\n";
+constexpr std::string_view kEndsOfWords = " \t\r\n,]}#";
 
 bool isAscii(char c) {
     return (static_cast<unsigned char>(c) & 0x80) == 0;
 }
 
-/// Looks at a text for characters beyond ASCII outside quotes and comments. TOML allows none there, but
-/// toml++ 3.3 comes to undefined behaviour when it asks whether such a character is a blank. Up to the first
-/// other mistake, where the parser stops, this finds quotes and comments where the parser does.
+bool isBracket(char c) {
+    return c == '[' || c == '{';
+}
+
+bool isKeyCharacter(char c) {
+    return utils::isLetter(c) || utils::isDigit(c) || c == '_' || c == '-' || c == '.';
+}
+
+/// TOML allows characters beyond ASCII in quotes and comments alone. Anywhere else toml++ 3.3 asks whether
+/// they are blanks, and that question has undefined behaviour; so they are refused before it sees them. Up to
+/// the first other mistake, where the parser stops, this class finds quotes and comments where the parser
+/// does.
 class AsciiCheck {
   public:
     explicit AsciiCheck(std::string_view text) : m_text(text) {
-        if (m_text.starts_with("\xEF\xBB\xBF")) m_at = 3;  // the byte order mark is allowed
+        if (m_text.starts_with("\xEF\xBB\xBF")) m_at = m_wordBegin = 3;  // the byte order mark is allowed
     }
 
     /// @throws TomlError
     void run() {
         for (; m_at < m_text.size(); ++m_at) {
             const char c = m_text[m_at];
-            if (c == '#')
-                m_at = m_text.find('\n', m_at);
-            else if (c == '"' || c == '\'')
+            if (c == '#') m_at = std::min(m_text.find('\n', m_at), m_text.size() - 1);
+            if (c == '"' || c == '\'')
                 passQuoted(c);
-            else
+            else if (kEndsOfWords.find(c) == std::string_view::npos)
                 requireAscii(m_at);
-            if (m_at == std::string_view::npos) return;
+            else
+                m_wordBegin = m_at + 1;
         }
     }
 
@@ -41,34 +51,54 @@ class AsciiCheck {
         if (place >= m_text.size() || isAscii(m_text[place])) return;
         const auto lines =
             std::count(m_text.begin(), m_text.begin() + static_cast<std::ptrdiff_t>(place), '\n');
-        throw TomlError("a character beyond ASCII stands outside quotes",
+        throw TomlError("a character beyond ASCII stands outside a text in quotes",
                         static_cast<std::size_t>(lines) + 1);
+    }
+
+    /// Brackets, a key and "=" may stand right before a quote. In other words, numbers above all, the parser
+    /// takes no notice of quotes.
+    bool isQuoteAtItsPlace() const {
+        std::string_view word = m_text.substr(m_wordBegin, m_at - m_wordBegin);
+        const auto skip = [&word](bool (*belongs)(char)) {
+            word.remove_prefix(
+                static_cast<std::size_t>(std::find_if_not(word.begin(), word.end(), belongs) - word.begin()));
+        };
+        skip(isBracket);
+        if (word.starts_with('_') || (!word.empty() && utils::isLetter(word[0]))) skip(isKeyCharacter);
+        if (word.starts_with('=')) word.remove_prefix(1);
+        skip(isBracket);
+        return word.empty();
     }
 
     /// Ends on the last character of a quoted text, or at the end of its line when it is not closed.
     void passQuoted(char quote) {
+        const bool isAtItsPlace = isQuoteAtItsPlace();
         const std::string three(3, quote);
         const bool hasLines = m_text.substr(m_at).starts_with(three);
-        for (m_at += hasLines ? 3 : 1; m_at < m_text.size(); ++m_at) {
-            const char c = m_text[m_at];
-            if (c == '\\' && quote == '"') {
-                passEscape(hasLines);
-            } else if (hasLines ? m_text.substr(m_at).starts_with(three) : c == quote || c == '\n') {
-                if (hasLines) m_at = std::min(m_text.find_first_not_of(quote, m_at), m_at + 5) - 1;
-                return;
-            }
+        const auto isEnd = [&] {
+            return hasLines ? m_text.substr(m_at).starts_with(three)
+                            : m_text[m_at] == quote || m_text[m_at] == '\n';
+        };
+        for (m_at += hasLines ? 3 : 1; m_at < m_text.size() && !isEnd(); ++m_at) {
+            if (!isAtItsPlace) requireAscii(m_at);
+            if (m_text[m_at] == '\\' && quote == '"') passEscape(hasLines);
         }
+        // The end of a text with lines may follow on one or two quotes that belong to it.
+        if (hasLines && m_at < m_text.size())
+            m_at = std::min(m_text.find_first_not_of(quote, m_at), m_at + 5) - 1;
+        // To the parser the word goes on behind a quote that it did not notice.
+        if (isAtItsPlace) m_wordBegin = m_at + 1;
     }
 
     /// A backslash at the end of a line continues it at the next character that is not a blank.
     void passEscape(bool hasLines) {
-        const std::size_t next = m_text.find_first_not_of(kBlanks, m_at + 1);
-        if (hasLines && next != m_at + 1) requireAscii(next);
+        if (hasLines) requireAscii(m_text.find_first_not_of(kBlanks, m_at + 1));
         ++m_at;
     }
 
     std::string_view m_text;
     std::size_t m_at = 0;
+    std::size_t m_wordBegin = 0;
 };
 
 /// "a, b or c"
