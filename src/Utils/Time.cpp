@@ -1,5 +1,6 @@
 #include "Utils/Time.h"
 
+#include <chrono>
 #include <ctime>
 
 #include "Utils/Exception.h"
@@ -11,9 +12,15 @@ namespace {
 
 constexpr std::uint64_t kMicrosecondsPerSecond = 1000000;
 
+/// The same year of a calendar that std::chrono knows: its years end at 32767, and the calendar repeats every
+/// 400.
+std::chrono::year likeYear(int year) {
+    return std::chrono::year(2000 + year % 400);
+}
+
 int daysOfMonth(int year, int month) {
-    if (month == 2) return Time::isLeapYear(static_cast<unsigned short>(year)) ? 29 : 28;
-    return month == 4 || month == 6 || month == 9 || month == 11 ? 30 : 31;
+    const auto last = (likeYear(year) / month / std::chrono::last).day();
+    return static_cast<int>(static_cast<unsigned int>(last));
 }
 
 }  // namespace
@@ -60,6 +67,7 @@ void Time::resetTimer() {
 
 void Time::setInterval(const Time& start) {
     QUENX_ASSERT_TEXT(start.m_isTimestamp, __FILE__, __LINE__, "dtStart.isTimestamp == true");
+    // Modulo 2^64: after the clock was set back, an interval is huge rather than an error in a running job.
     m_value = os::getuSecondsSinceEpoch() - start.m_value;
     m_isTimestamp = false;
 }
@@ -87,6 +95,7 @@ void Time::get(int& year, int& month, int& day, int& hour, int& minute, int& sec
 void Time::decodeToDate(int& year, int& month, int& day, int& hour, int& minute, int& second) const {
     QUENX_ASSERT_TEXT(m_isTimestamp, __FILE__, __LINE__, "this->isTimestamp");
     const auto seconds = static_cast<std::time_t>(getSeconds());
+    // Not std::chrono's calendar, whose years end at 32767: a value may lie beyond.
     std::tm fields{};
     QUENX_ASSERT_TEXT(gmtime_r(&seconds, &fields) != nullptr, __FILE__, __LINE__, "ptm != __null");
     year = fields.tm_year + 1900;
@@ -107,7 +116,7 @@ void Time::decodeToPeriod(int& days, int& hours, int& minutes, int& seconds) con
 }
 
 bool Time::isLeapYear(unsigned short year) {
-    return (year % 4 == 0 && year % 100 != 0) || year % 400 == 0;
+    return likeYear(year).is_leap();
 }
 
 Time& Time::operator=(unsigned long long microseconds) {
