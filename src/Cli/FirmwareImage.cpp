@@ -4,8 +4,9 @@
 
 #include <algorithm>
 #include <cerrno>
-#include <fstream>
-#include <iterator>
+#include <system_error>
+
+#include "Utils/Os/Linux/linux.h"
 
 namespace cli {
 
@@ -27,13 +28,6 @@ std::string kindProblem(const struct stat& info) {
     const auto bytes = static_cast<std::uint64_t>(info.st_size);
     if (bytes > LARGEST_IMAGE) return "is larger than 2 GiB";
     return bytes > LARGEST_READ ? "is larger than any firmware image for a network adapter" : "";
-}
-
-bool readWhole(const std::string& path, std::vector<std::uint8_t>& content) {
-    std::ifstream file(path, std::ios::binary);
-    if (!file) return false;
-    content.assign(std::istreambuf_iterator<char>(file), std::istreambuf_iterator<char>());
-    return true;
 }
 
 std::string firstForeignIds(const ma::RomFile& rom, const std::string& adapterIds) {
@@ -86,13 +80,18 @@ FirmwareImage readFirmwareImage(const std::string& path) {
         return image;
     }
     image.bytes = static_cast<std::uint64_t>(info.st_size);
-    std::vector<std::uint8_t> content;
-    errno = 0;
-    if (!readWhole(path, content)) {
-        image.problem = cannotRead(path, errno);
+    std::optional<std::vector<std::uint8_t>> content;
+    try {
+        content = os::readWholeFile(path, LARGEST_READ);
+    } catch (const std::system_error& error) {
+        image.problem = cannotRead(path, error.code().value());
         return image;
     }
-    image.rom = ma::parseOptionRom(content);
+    if (!content) {
+        image.problem = cannotRead(path, ENOENT);
+        return image;
+    }
+    image.rom = ma::parseOptionRom(*content);
     if (image.rom.error) {
         image.problem = notAnImage(path, "is not a complete firmware image: " + *image.rom.error);
     }

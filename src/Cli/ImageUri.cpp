@@ -3,29 +3,25 @@
 #include <algorithm>
 #include <filesystem>
 
+#include "Utils/Utils.h"
+
 namespace cli {
 
 namespace {
 
 constexpr std::string_view AUTHORITY = "//";
 
-bool isLetter(char c) {
-    return (c >= 'a' && c <= 'z') || (c >= 'A' && c <= 'Z');
-}
-
 bool isSchemeCharacter(char c) {
-    return isLetter(c) || (c >= '0' && c <= '9') || c == '+' || c == '-' || c == '.';
+    return utils::isLetter(c) || utils::isDigit(c) || c == '+' || c == '-' || c == '.';
 }
 
 }  // namespace
 
 std::string uriScheme(std::string_view uri) {
     const auto colon = uri.find(':');
-    if (colon == std::string_view::npos || colon == 0 || !isLetter(uri.front())) return {};
-    std::string scheme(uri.substr(0, colon));
+    if (colon == std::string_view::npos || colon == 0 || !utils::isLetter(uri.front())) return {};
+    const std::string scheme = utils::lowerCase(uri.substr(0, colon));
     if (!std::all_of(scheme.begin(), scheme.end(), isSchemeCharacter)) return {};
-    std::transform(scheme.begin(), scheme.end(), scheme.begin(),
-                   [](char c) { return c >= 'A' && c <= 'Z' ? static_cast<char>(c - 'A' + 'a') : c; });
     return scheme;
 }
 

@@ -4,6 +4,7 @@
 #include "CimXml/Response.h"
 #include "CimXml/WireError.h"
 #include "Cli/Failure.h"
+#include "Utils/Utils.h"
 
 namespace cli {
 
@@ -14,19 +15,14 @@ using cimxml::Parameter;
 using cimxml::ParameterValue;
 
 std::string percentEncoded(const std::string& text) {
-    constexpr std::string_view DIGITS = "0123456789ABCDEF";
     std::string result;
     for (const char c : text) {
-        const auto byte = static_cast<unsigned char>(c);
-        const bool isPlain = (c >= 'a' && c <= 'z') || (c >= 'A' && c <= 'Z') || (c >= '0' && c <= '9') ||
-                             c == '.' || c == '_' || c == '-' || c == '=' || c == ',';
-        if (isPlain) {
+        const bool isPlain = utils::isLetter(c) || utils::isDigit(c) || c == '.' || c == '_' || c == '-' ||
+                             c == '=' || c == ',';
+        if (isPlain)
             result += c;
-        } else {
-            result += '%';
-            result += DIGITS[byte >> 4];
-            result += DIGITS[byte & 0xF];
-        }
+        else
+            result += utils::formatStr("%%%02X", static_cast<unsigned char>(c));
     }
     return result;
 }

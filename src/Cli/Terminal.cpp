@@ -5,6 +5,8 @@
 
 #include <cstdlib>
 
+#include "Utils/Utils.h"
+
 namespace cli {
 
 namespace {
@@ -12,11 +14,6 @@ namespace {
 bool isSet(const char* variable) {
     const char* value = std::getenv(variable);
     return value != nullptr && *value != '\0';
-}
-
-bool isControl(char c) {
-    const auto byte = static_cast<unsigned char>(c);
-    return byte < 0x20 || byte == 0x7F;
 }
 
 }  // namespace
@@ -44,18 +41,13 @@ std::string elideMiddle(std::string_view text, std::size_t width) {
 }
 
 std::string printable(std::string_view text) {
-    constexpr std::string_view DIGITS = "0123456789abcdef";
     std::string result;
     result.reserve(text.size());
     for (const char c : text) {
-        if (!isControl(c)) {
+        if (utils::isControl(c))
+            result += "\\x" + utils::hexByte(static_cast<unsigned char>(c));
+        else
             result += c;
-            continue;
-        }
-        const auto byte = static_cast<unsigned char>(c);
-        result += "\\x";
-        result += DIGITS[byte >> 4];
-        result += DIGITS[byte & 0xF];
     }
     return result;
 }

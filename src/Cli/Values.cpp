@@ -1,6 +1,7 @@
 #include "Cli/Values.h"
 
 #include "Cli/Terminal.h"
+#include "Utils/Utils.h"
 
 namespace cli {
 
@@ -31,19 +32,10 @@ std::vector<T> elementsOf(const core::InstanceValue& instance, std::string_view 
     return result;
 }
 
-std::string quoted(const std::string& text) {
-    std::string result = "\"";
-    for (const char c : text) {
-        if (c == '"' || c == '\\') result += '\\';
-        result += c;
-    }
-    return printable(result + '"');
-}
-
 std::string displayScalar(core::CimType type, const core::CimScalar& value) {
     const std::string text = core::scalarText(type, value);
     const bool isText = type == core::CimType::String || type == core::CimType::Char16;
-    return isText ? quoted(text) : printable(text);
+    return printable(isText ? utils::quoted(text) : text);
 }
 
 }  // namespace

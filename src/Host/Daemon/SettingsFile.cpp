@@ -1,4 +1,5 @@
 #include <algorithm>
+#include <cstdint>
 #include <stdexcept>
 
 #include "Host/Daemon/SettingsField.h"
@@ -63,8 +64,7 @@ void setField(const std::vector<SettingsField>& fields, const std::string& key, 
 }
 
 toml::table parse(const std::string& file) {
-    constexpr std::size_t kMostText = std::size_t{1} << 20;
-    const auto bytes = os::readWholeFile(file, kMostText);
+    const auto bytes = os::readWholeFile(file, SIZE_MAX);
     if (!bytes) throw std::runtime_error(file + ": there is no such file");
     try {
         return ma::parseToml({reinterpret_cast<const char*>(bytes->data()), bytes->size()});

@@ -3,11 +3,12 @@
 #include <algorithm>
 #include <array>
 #include <cerrno>
+#include <cstdint>
 #include <cstring>
-#include <fstream>
-#include <iterator>
 #include <stdexcept>
 #include <vector>
+
+#include "Utils/Os/Linux/linux.h"
 
 namespace host {
 
@@ -22,9 +23,9 @@ void check(int status, const std::string& file) {
 }
 
 std::string readWhole(const std::string& file) {
-    std::ifstream stream(file, std::ios::binary);
-    if (!stream) fail(file, std::strerror(errno));
-    return {std::istreambuf_iterator<char>(stream), std::istreambuf_iterator<char>()};
+    const auto bytes = os::readWholeFile(file, SIZE_MAX);
+    if (!bytes) fail(file, std::strerror(ENOENT));
+    return {bytes->begin(), bytes->end()};
 }
 
 gnutls_datum_t datumOf(std::string& text) {
