@@ -46,7 +46,7 @@ std::string_view withoutDomain(std::string_view pciAddress) {
 bool isMeant(const Adapter& adapter, const std::string& target, const std::optional<core::CimPath>& path) {
     const std::string_view address = withoutDomain(adapter.pciAddress);
     return adapter.name == target || (!address.empty() && core::sameName(address, withoutDomain(target))) ||
-           (path && adapter.path.names(*path));
+           (path && adapter.path.isSameObjectAs(*path));
 }
 
 Failure unknownAdapter(const std::string& target, const std::vector<Adapter>& adapters) {

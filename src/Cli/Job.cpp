@@ -22,7 +22,7 @@ void nameAdapters(Management& management, std::vector<JobView>& jobs) {
     const auto ports = management.enumerateInstances("Quenx_EthernetPort");
     const auto nameOf = [&ports](const core::CimPath& path) {
         const auto port = std::find_if(ports.begin(), ports.end(),
-                                       [&path](const auto& one) { return one.path.names(path); });
+                                       [&path](const auto& one) { return one.path.isSameObjectAs(path); });
         return port == ports.end() ? std::string() : textOf(*port, "Name");
     };
     for (const core::CimPath& affected : management.enumerateInstanceNames("Quenx_AffectedJobElement")) {
@@ -30,8 +30,9 @@ void nameAdapters(Management& management, std::vector<JobView>& jobs) {
         const core::CimPath* affecting = endOf(affected, "AffectingElement");
         const std::string name = element == nullptr ? std::string() : nameOf(*element);
         if (name.empty() || affecting == nullptr) continue;  // a job affects the card of its port, too
-        const auto job = std::find_if(jobs.begin(), jobs.end(),
-                                      [affecting](const JobView& one) { return one.path.names(*affecting); });
+        const auto job = std::find_if(jobs.begin(), jobs.end(), [affecting](const JobView& one) {
+            return one.path.isSameObjectAs(*affecting);
+        });
         if (job != jobs.end()) job->adapter = name;
     }
 }

@@ -30,7 +30,7 @@ TEST(CimPathTest, KeepsATextThatDoesNotParseAndNamesNothing) {
         const CimPath path(text);
         EXPECT_FALSE(path.isValid()) << text;
         EXPECT_EQ(path.toString(), text);
-        EXPECT_FALSE(path.names(path)) << text;
+        EXPECT_FALSE(path.isSameObjectAs(path)) << text;
     }
 }
 
@@ -54,13 +54,13 @@ TEST(CimPathTest, ComparesNamesWithoutCaseAndValuesByType) {
          }) {
         const CimPath left{std::string(row.left)};
         const CimPath right{std::string(row.right)};
-        EXPECT_EQ(left.names(right), row.same) << row.left << " / " << row.right;
-        EXPECT_EQ(right.names(left), row.same) << row.left << " / " << row.right;
+        EXPECT_EQ(left.isSameObjectAs(right), row.same) << row.left << " / " << row.right;
+        EXPECT_EQ(right.isSameObjectAs(left), row.same) << row.left << " / " << row.right;
     }
     // A reference as a value, and the same as the quoted text that a path holds.
     const CimPath value("Link", {{"From", core::CimScalar(CimPath(std::string("Thing.Name=\"x\"")))}});
-    EXPECT_TRUE(value.names(CimPath(std::string("LINK.from=\"root/x:thing.NAME=\\\"x\\\"\""))));
-    EXPECT_FALSE(value.names(CimPath(std::string("Link.From=\"Thing.Name=\\\"y\\\"\""))));
+    EXPECT_TRUE(value.isSameObjectAs(CimPath(std::string("LINK.from=\"root/x:thing.NAME=\\\"x\\\"\""))));
+    EXPECT_FALSE(value.isSameObjectAs(CimPath(std::string("Link.From=\"Thing.Name=\\\"y\\\"\""))));
 }
 
 }  // namespace

@@ -111,7 +111,8 @@ TEST_F(DispatcherTest, ReadsInstancesAndTheirNeighbours) {
     // The path comes back in a request, with the keys of its references as texts.
     const auto names = call("ReferenceNames", {{"ObjectName", a}}).paths;
     ASSERT_EQ(names.size(), 1U);
-    EXPECT_TRUE(names[0].names(call("GetInstance", {{"InstanceName", link()}}).instances.at(0).path));
+    EXPECT_TRUE(
+        names[0].isSameObjectAs(call("GetInstance", {{"InstanceName", link()}}).instances.at(0).path));
 
     // However many instances are at the far ends, their class is enumerated once.
     m_agent.links().instances.add(new test::Link(m_c, m_a));

@@ -90,6 +90,7 @@ void CimBroker::removeAgent(CimAgent* agent) noexcept {
         leaving = std::move(*found);
         m_agents.erase(found);
     }
+    // Outside the lock: the requests waited for may ask the broker themselves.
     for (int users = leaving->users; users != 0; users = leaving->users)
         leaving->users.wait(users);
 }
@@ -112,7 +113,7 @@ CimInstance* CimBroker::getInstanceByPath(CimPath& path) {
         if (!use.agent().isClassSupported(path.getClassName())) continue;
         List::Iterator instances = use.agent().getInstances(path.getClassName());
         for (CimInstance* instance = instances.first(); instance != nullptr; instance = instances.next()) {
-            if (path.names(*instance)) return instance;
+            if (path.isSameObjectAs(*instance)) return instance;
         }
     }
     return nullptr;
@@ -125,6 +126,7 @@ List::Iterator CimBroker::getInstances(std::string className, std::string provid
         if (!providerName.empty() && agent.getProviderName() != providerName) continue;
         if (agent.isClassSupported(className)) parts.push_back(agent.getInstances(className));
     }
+    // The usual case, without a copy of all elements.
     if (parts.size() == 1) return std::move(parts.front());
     return List::Iterator(std::make_unique<JoinedIterator>(std::move(parts)));
 }

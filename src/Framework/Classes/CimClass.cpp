@@ -69,6 +69,8 @@ void CimClasses::clear() {
         const utils::Mutex::AutoLocker lock(m_mutex);
         released.swap(m_served);
     }
+    // One by one from the end: a vector's destructor promises no order, and later class objects may use
+    // earlier ones.
     while (!released.empty())
         released.pop_back();
 }

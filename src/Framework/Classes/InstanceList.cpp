@@ -92,6 +92,7 @@ InstanceList::SharedSnapshot InstanceList::snapshot() {
 }
 
 void InstanceList::add(CimInstance* element) {
+    // Owned before anything can throw, so that a caller never has to clean up.
     const std::shared_ptr<CimInstance> owned(element, InstanceRelease{});
     element->m_list = m_link;
     holdInScope(owned);
@@ -141,6 +142,7 @@ void InstanceList::publish(InstanceList& rebuilt) {
         elements.swap(rebuilt.getStlList());
         rebuilt.m_cached.reset();
     }
+    // Before they are listed: from then on any thread may delete one.
     for (const auto& instance : taken)
         instance->m_list = m_link;
     const utils::Mutex::AutoLocker lock(getMutex());

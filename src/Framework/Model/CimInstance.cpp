@@ -20,6 +20,7 @@ std::string CimInstance::getCreationClassName() const {
 
 unsigned int CimInstance::modifyInstance(CimPropertyList& requested) {
     const RecursiveLocker lock(m_mutex);
+    // Everything is checked before anything is set: half a modification helps nobody.
     std::vector<std::pair<CimProperty*, CimProperty*>> changes;
     for (const auto& wanted : requested.getProperties()) {
         CimProperty* current = getPropertyByName(wanted->getName());

@@ -178,7 +178,7 @@ void CimPath::completeNamespace(std::string_view name) {
     }
 }
 
-bool CimPath::names(const CimPath& other) const {
+bool CimPath::isSameObjectAs(const CimPath& other) const {
     if (!isValid() || !other.isValid() || m_keys.size() != other.m_keys.size()) return false;
     if (!sameName(m_className, other.m_className)) return false;
     if (!m_namespace.empty() && !other.m_namespace.empty() && !sameName(m_namespace, other.m_namespace))
@@ -191,7 +191,7 @@ bool CimPath::names(const CimPath& other) const {
     });
 }
 
-bool CimPath::names(const CimInstance& instance) const {
+bool CimPath::isSameObjectAs(const CimInstance& instance) const {
     if (!isValid() || !sameName(m_className, instance.getCreationClassName())) return false;
     const RecursiveLocker lock(instance.getMutex());
     const std::vector<CimProperty*> properties = instance.getKeys();

@@ -58,10 +58,10 @@ class QUENX_EXPORT CimPath {
     /// The same object: class, key names and namespace without regard to case, values by type (numbers by
     /// value, texts exactly, references as paths), keys in any order. The host is ignored, and a missing
     /// namespace equals any. A path that names nothing equals none, itself included.
-    bool names(const CimPath& other) const;
+    bool isSameObjectAs(const CimPath& other) const;
 
-    /// As names(), against the instance's class and current key values, without building its path.
-    bool names(const CimInstance& instance) const;
+    /// As above, against the instance's class and current key values, without building its path.
+    bool isSameObjectAs(const CimInstance& instance) const;
 
   private:
     bool parse(std::string_view text);

@@ -15,7 +15,7 @@ std::string_view withoutBlanks(std::string_view text) {
     return text.substr(first, text.find_last_not_of(" \t\r\n") - first + 1);
 }
 
-unsigned bitsOf(CimType type) {
+std::uint32_t bitsOf(CimType type) {
     switch (type) {
         case CimType::Uint8:
         case CimType::Sint8:
@@ -32,12 +32,12 @@ unsigned bitsOf(CimType type) {
 }
 
 bool fits(CimType type, std::uint64_t value) {
-    const unsigned bits = bitsOf(type);
+    const std::uint32_t bits = bitsOf(type);
     return bits == 64 || value < (std::uint64_t{1} << bits);
 }
 
 bool fits(CimType type, std::int64_t value) {
-    const unsigned bits = bitsOf(type);
+    const std::uint32_t bits = bitsOf(type);
     if (bits == 64) return true;
     const std::int64_t bound = std::int64_t{1} << (bits - 1);
     return value >= -bound && value < bound;
@@ -93,7 +93,7 @@ bool sameInteger(std::uint64_t left, std::int64_t right) {
 
 /// A text against a value of a type that paths write in quotes.
 bool sameQuoted(const std::string& text, const CimScalar& other) {
-    if (const auto* path = std::get_if<CimPath>(&other)) return path->names(CimPath(text));
+    if (const auto* path = std::get_if<CimPath>(&other)) return path->isSameObjectAs(CimPath(text));
     if (const auto* time = std::get_if<utils::Time>(&other)) return datetimeText(*time) == text;
     return false;
 }
@@ -124,7 +124,7 @@ bool sameValue(const CimScalar& left, const CimScalar& right) {
         if (const auto* text = std::get_if<std::string>(&right)) return sameQuoted(*text, left);
         return false;
     }
-    if (const auto* path = std::get_if<CimPath>(&left)) return path->names(std::get<CimPath>(right));
+    if (const auto* path = std::get_if<CimPath>(&left)) return path->isSameObjectAs(std::get<CimPath>(right));
     if (const auto* time = std::get_if<utils::Time>(&left)) {
         return datetimeText(*time) == datetimeText(std::get<utils::Time>(right));
     }

@@ -51,7 +51,7 @@ struct QUENX_EXPORT CimValue {
 QUENX_EXPORT std::string scalarText(CimType type, const CimScalar& value);
 
 /// Reads a text as a value of the type. Integers in decimal or 0x..., within the range of the type; booleans
-/// in any case; blanks around numbers and booleans are ignored. Nothing where the text is no such value.
+/// in any case; blanks around numbers and booleans are ignored. Nothing for any other text.
 QUENX_EXPORT std::optional<CimScalar> parseScalar(CimType type, std::string_view text);
 
 /// The value as the type wants it held, where that loses nothing (a signed 5 for a uint16, a text for a

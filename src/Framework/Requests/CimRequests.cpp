@@ -80,6 +80,7 @@ void CimRequests::deleteInstance(const CimPath& path) {
             isSupported = true;
             const int code = each->deleteInstance(*each->object, typed);
             if (code == 0) return;
+            // Another agent that serves the class may have it.
             if (code == kDeleteNotFound) continue;
             throw CimError(CimStatus::Failed, "the deletion of " + typed.toString() + " ended with code " +
                                                   std::to_string(code));
@@ -98,6 +99,7 @@ ClassChain CimRequests::getClass(const std::string& className) {
 std::vector<ClassChain> CimRequests::enumerateClasses(const std::string& className, bool deep) {
     const ServedClasses classes(m_broker);
     if (!className.empty()) classes.requireChain(className);
+    // By name, since many served classes share their superclasses.
     std::map<std::string, ClassChain> found;
     for (const ClassChain* chain : classes.chains()) {
         for (auto first = chain->begin(); first != chain->end(); ++first) {

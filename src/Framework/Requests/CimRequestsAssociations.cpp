@@ -44,7 +44,7 @@ void visitReferences(const ServedClasses& classes, const CimPath& path, const st
         for (CimInstance* instance : InstanceRange(each->object->getInstances())) {
             const std::vector<End> ends = endsOf(*instance);
             for (std::size_t i = 0; i < ends.size(); ++i) {
-                if (isRole(role, ends[i]) && ends[i].path.names(path)) visit(*instance, ends, i);
+                if (isRole(role, ends[i]) && ends[i].path.isSameObjectAs(path)) visit(*instance, ends, i);
             }
         }
     }
@@ -110,6 +110,7 @@ class InstanceFinder {
 /// The association instances that refer to the path, each once.
 void visitAssociations(const ServedClasses& classes, const CimPath& path, const AssociationFilter& by,
                        const std::function<void(CimInstance&, CimPath)>& visit) {
+    // The results are the associations, so ResultClass means their class (DSP0200 5.4.2.10).
     const std::string& wanted = by.associationClass.empty() ? by.resultClass : by.associationClass;
     std::set<std::string> seen;
     visitReferences(classes, startOf(classes, path, by), wanted, by.role,

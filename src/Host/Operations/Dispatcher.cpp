@@ -59,6 +59,7 @@ IntrinsicResult Dispatcher::call(const cimxml::IntrinsicCall& call, const Caller
 }
 
 core::MethodResult Dispatcher::call(const cimxml::MethodCall& call, const Caller& caller) {
+    // Before anything else, so that a reader learns nothing of what there is to call.
     requirePrivilege(methodPrivilege(), caller);
     core::CimOperations& target = findNamespace(call.object.getNamespace());
     std::vector<core::Argument> arguments;

@@ -119,8 +119,9 @@ InstanceValue InteropNamespace::getInstance(const CimPath& path, const core::Pro
     if (!sources(path.getClassName()).empty()) return relocated(m_implementation->getInstance(path, filter));
     const CimPath typed =
         core::typedPath(path, [this](const std::string& name) { return m_model->findClass(name); });
+    // The manager's own instances are few: they are made anew for each request.
     for (InstanceValue& own : m_model->instances(m_name)) {
-        if (own.path.names(typed)) return filtered(std::move(own), filter);
+        if (own.path.isSameObjectAs(typed)) return filtered(std::move(own), filter);
     }
     throw core::CimError(core::CimStatus::NotFound, path.toString() + " names no instance");
 }

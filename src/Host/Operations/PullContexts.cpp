@@ -88,6 +88,7 @@ PullContexts::Entries::iterator PullContexts::find(const PullOwner& owner, const
 IntrinsicResult PullContexts::open(const PullOwner& owner, IntrinsicResult result, std::size_t count,
                                    std::optional<std::uint32_t> timeoutSeconds) {
     const std::chrono::seconds timeout = checkedTimeout(timeoutSeconds);
+    // Taken from the end, so that each pull costs what it delivers and frees it.
     std::reverse(result.instances.begin(), result.instances.end());
     std::reverse(result.paths.begin(), result.paths.end());
     IntrinsicResult part = takeNext(result, count);

@@ -53,7 +53,7 @@ TEST_F(FirmwareTest, ComesAndGoesWithItsFile) {
     m_folder.write("a/one.rom", rom(1));
     EXPECT_EQ(images(), Rows{"1af4:1041 IMG_PXE 1, IMG_UEFI 0"});
     const auto path = m_requests.enumerateInstanceNames("Quenx_SoftwareIdentity").front();
-    EXPECT_TRUE(m_requests.getInstance(path).path.names(path));
+    EXPECT_TRUE(m_requests.getInstance(path).path.isSameObjectAs(path));
 
     // The same firmware is served once, wherever its files are.
     const std::string copy = m_folder.write("b/a copy::.rom", rom(1));
