@@ -1,4 +1,5 @@
 #!/usr/bin/env bash
+# SPDX-License-Identifier: Apache-2.0
 # Installs what is missing, builds, and updates the firmware of a simulated Ethernet adapter with a real option-ROM
 # image. Asks nothing, needs root or sudo only for missing packages, and starts afresh each time. All it writes, apart
 # from packages, is in build.

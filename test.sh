@@ -1,4 +1,5 @@
 #!/usr/bin/env bash
+# SPDX-License-Identifier: Apache-2.0
 # Installs what is missing, builds, and runs all tests.
 #
 #   ./test.sh                 the default build and the one with the address and undefined-behaviour sanitizers
@@ -21,7 +22,7 @@ for argument in "$@"; do
     case "$argument" in
         --ci) CI=true ;;
         -h | --help)
-            sed -n '2,10s/^# \{0,1\}//p' "$0"
+            sed -n '3,11s/^# \{0,1\}//p' "$0"
             exit 0
             ;;
         -*)

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Rebuilding the associations between jobs, service and adapters.
 #include <benchmark/benchmark.h>
 #include <dlfcn.h>

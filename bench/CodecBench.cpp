@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The speed of the CIM-XML codec: bytes to values and values to bytes, without a socket.
 #include <benchmark/benchmark.h>
 #include <dlfcn.h>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Enumerating jobs that were built but not started, refresh included: time and memory per job.
 #include <benchmark/benchmark.h>
 #include <malloc.h>

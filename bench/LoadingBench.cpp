@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // From dlopen to the first enumerated service instance, and the process's resident memory then.
 #include <benchmark/benchmark.h>
 #include <dlfcn.h>

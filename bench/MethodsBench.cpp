@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // What the methods cost beyond the verification of the image: the image is small, and accepted at once.
 #include <benchmark/benchmark.h>
 #include <dlfcn.h>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The reliability tests, tried thoroughly:  soak [--seconds=N] [--jobs=N] [GoogleTest's own flags]
 // Prints the figures of docs/reliability.md at its end.
 #include <gtest/gtest.h>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Verifying an image of 31 MiB from the page cache, and reading the same file into memory once.
 #include <benchmark/benchmark.h>
 

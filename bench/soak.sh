@@ -1,4 +1,5 @@
 #!/usr/bin/env bash
+# SPDX-License-Identifier: Apache-2.0
 # The long run: the soak program, and a minute of each fuzz target. Takes SECONDS of stress, 60 if not given.
 set -euo pipefail
 cd "$(dirname "${BASH_SOURCE[0]}")/.."

@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: Apache-2.0
 # With ccache on the machine, nothing is compiled twice: not after a clean, not when a branch changes back and, with g++,
 # not in another checkout. -DQUENX_CCACHE=OFF turns it off; a launcher that the caller sets is left alone.
 option(QUENX_CCACHE "Compile through ccache where it is installed" ON)

@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: Apache-2.0
 # An editor's language server looks for compile_commands.json at the top: that of the build configured last, but for those
 # whose flags would only be in its way.
 set(quenx_commands ${PROJECT_SOURCE_DIR}/compile_commands.json)

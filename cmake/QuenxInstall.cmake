@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: Apache-2.0
 # What `cmake --install` puts where. The programs find the libraries, and the libraries each other, from where they are
 # themselves, so that an installation can be staged and moved.
 set(CMAKE_INSTALL_DEFAULT_DIRECTORY_PERMISSIONS  # whatever the mask of whoever installs

@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: Apache-2.0
 # Run by `cmake --install` for files that are an administrator's once they are there. Installs those of
 # quenx_configuration_files, in quenx_configuration_source, below quenx_sysconfdir where there are none yet.
 if(NOT IS_ABSOLUTE "${quenx_sysconfdir}")

@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: Apache-2.0
 # Parsing the standard library and GoogleTest is most of the work of compiling this project's small files. With
 # QUENX_PRECOMPILE it is done once for all targets of a kind; the presets without it show a missing #include.
 option(QUENX_PRECOMPILE "Use precompiled headers" OFF)

@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: Apache-2.0
 # One place for the compiler's settings: every target of the project links quenx_settings.
 
 find_package(Threads REQUIRED)

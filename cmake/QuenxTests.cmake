@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: Apache-2.0
 # GoogleTest from Debian's package; its 32-bit form is built from the sources that the package carries.
 include(GoogleTest)
 if(QUENX_X86_32)

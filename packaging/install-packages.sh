@@ -1,4 +1,5 @@
 #!/usr/bin/env bash
+# SPDX-License-Identifier: Apache-2.0
 # Installs the packages of the named groups of debian-packages.txt that are missing. Asks nothing.
 #
 #   packaging/install-packages.sh GROUP...

@@ -1,4 +1,5 @@
 #!/usr/bin/env bash
+# SPDX-License-Identifier: Apache-2.0
 # Line and branch coverage of the provider's own code, and the lines that no test reaches.
 # Fails when less than 95 % of its lines are reached. Needs gcovr.
 set -euo pipefail

@@ -1,4 +1,5 @@
 #!/usr/bin/env bash
+# SPDX-License-Identifier: Apache-2.0
 # Runs the demo and the release tests where such things go wrong: as an ordinary user, in a folder with blanks and
 # umlauts, with variables and a configuration in /etc that must not matter, and with everything else read-only.
 # An ordinary user runs it as himself. Where nothing can be mounted, /etc is as it is, and nothing is read-only.

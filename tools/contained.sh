@@ -1,4 +1,5 @@
 #!/usr/bin/env bash
+# SPDX-License-Identifier: Apache-2.0
 # Runs a command, in this folder, that can write to nothing but the named folders, devices, and a /tmp of its own that
 # is empty at first and gone at the end: an attempt to write elsewhere fails. Needs root.
 #

@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: Apache-2.0
 # Sourced by the scripts that build and run things: drops every variable of the caller's but those named here, so that a
 # proxy, adapters or compiler flags that somebody exported change nothing.
 _quenx_keep=" PATH HOME USER LOGNAME SHELL TERM NO_COLOR TMPDIR PWD SHLVL _ CI JOBS FUZZ_SECONDS \

@@ -1,4 +1,5 @@
 #!/usr/bin/env bash
+# SPDX-License-Identifier: Apache-2.0
 # Checks the format of C++ files and what clang-tidy and cppcheck say of them. Changes nothing.
 #
 #   tools/lint.sh             what differs from main, changes that are not committed included

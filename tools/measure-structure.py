@@ -1,4 +1,5 @@
 #!/usr/bin/env python3
+# SPDX-License-Identifier: Apache-2.0
 """Counts how the code is cut: files, functions, comments and includes.
 
     tools/measure-structure.py            the figures

@@ -1,4 +1,5 @@
 #!/usr/bin/env bash
+# SPDX-License-Identifier: Apache-2.0
 # Says at once which of the named tools are missing, and fails then:  tools/need.sh TOOL...
 set -euo pipefail
 

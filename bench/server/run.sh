@@ -1,4 +1,5 @@
 #!/usr/bin/env bash
+# SPDX-License-Identifier: Apache-2.0
 # How fast quenx-cimd answers, over HTTP and HTTPS, and how much memory it takes: starts one on free loopback ports,
 # with simulated adapters that write at once and with 1,000 ended jobs, and lets wrk post to it.
 #

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The HTTP headers of a request, and whether they say what its body says.
 #include <algorithm>
 #include <array>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "CimXml/ClassCodec.h"
 #include "CimXml/Message.h"
 #include "CimXml/Response.h"

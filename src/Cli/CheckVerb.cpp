@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "Cli/Busyness.h"
 #include "Cli/Candidate.h"
 #include "Cli/Explanation.h"

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "Cli/Identities.h"
 #include "Cli/Json.h"
 #include "Cli/TextTable.h"

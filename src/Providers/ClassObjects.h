@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // How class objects come by their instances: once, anew at each enumeration, or only when something changed.
 #pragma once
 

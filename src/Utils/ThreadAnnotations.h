@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #pragma once
 
 /// Clang's thread-safety annotations; empty where the compiler does not know them.

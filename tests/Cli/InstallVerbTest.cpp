@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // What a service does to quenxctl that the simulated adapters do not.
 #include <gtest/gtest.h>
 

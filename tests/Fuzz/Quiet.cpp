@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // For targets whose refusals would each write a backtrace.
 #include "Utils/Log.h"
 

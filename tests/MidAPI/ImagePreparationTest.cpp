@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "MidAPI/Image/ImagePreparation.h"
 
 #include <gtest/gtest.h>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Loaded by a host that has nothing of the framework, to count the agents there are.
 #include "Framework/Classes/CimBroker.h"
 

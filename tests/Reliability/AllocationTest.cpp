@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Memory runs out at the n-th allocation of an update, for every n.
 #include <thread>
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The image file changes under the update, or was never an ordinary file.
 #include <sys/stat.h>
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Every call that an update makes fails, throws or stalls, one at a time.
 #include <thread>
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // This program's own operator new and delete, and its pthread_create: they serve the shared libraries, too.
 #include "Reliability/Interposed.h"
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // What a client sends is logged, and stays inside the line that it is logged in.
 #include "Providers/SoftwareUpdate/UpdateTest.h"
 #include "Reliability/Effort.h"

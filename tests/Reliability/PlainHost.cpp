@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Loads two providers as a host does that knows nothing of them, closes them in the order given and prints
 // what is left after each step. Arguments: the libraries in the order of loading, the counter of agents, and
 // which of the two to close first, 0 or 1.

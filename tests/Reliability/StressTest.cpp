@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Many clients at once, while adapters are being written to and files come and go.
 #include <algorithm>
 #include <filesystem>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The provider's library goes while its jobs are new, running or finished, and comes back.
 #include <gtest/gtest.h>
 

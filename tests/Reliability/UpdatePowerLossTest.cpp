@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The power fails at the k-th change that an update makes to the flash, for every k.
 #include <map>
 

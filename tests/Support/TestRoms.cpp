@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "Support/TestRoms.h"
 
 #include "Support/TempFolder.h"

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // quenx-cimd as a whole, driven by the WBEM client wbemcli.
 #include <gtest/gtest.h>
 #include <sys/socket.h>

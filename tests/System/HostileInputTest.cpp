@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // What the daemon does with clients that mean it no good, while a good one goes on.
 #include <gtest/gtest.h>
 #include <sys/resource.h>

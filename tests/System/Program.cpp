@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "System/Program.h"
 
 #include <fcntl.h>

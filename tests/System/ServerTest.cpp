@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // quenxctl on a server: the same verbs over CIM-XML, against a real quenx-cimd.
 #include <gtest/gtest.h>
 

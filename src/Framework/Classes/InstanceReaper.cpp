@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "Framework/Classes/InstanceReaper.h"
 
 #include <condition_variable>

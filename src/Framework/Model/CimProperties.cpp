@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "Framework/Model/CimProperties.h"
 
 #include "Framework/Model/CimError.h"

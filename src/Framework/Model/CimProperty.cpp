@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "Framework/Model/CimProperty.h"
 
 #include "Framework/Model/CimError.h"

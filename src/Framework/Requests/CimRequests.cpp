@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Instances: enumerating, reading, deleting. And the classes that they are of.
 #include "Framework/Requests/CimRequests.h"
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Calling methods: the arguments are checked against the declaration and completed here, once for all fronts.
 #include <algorithm>
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include <grp.h>
 #include <pwd.h>
 #include <security/pam_appl.h>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Making a key and a self-signed certificate.
 #include <fcntl.h>
 #include <gnutls/crypto.h>

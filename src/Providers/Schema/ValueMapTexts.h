@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #pragma once
 
 /// Value maps that several classes share, in the form of core::CimElementText::values.

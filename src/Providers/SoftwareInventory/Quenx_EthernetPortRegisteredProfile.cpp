@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "Providers/SoftwareInventory/Quenx_EthernetPortRegisteredProfile.h"
 
 constinit const core::CimClassInfo Quenx_EthernetPortRegisteredProfile::classInfo{

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "Providers/SoftwareUpdate/AdapterClaim.h"
 
 #include "Providers/SoftwareUpdate/MethodResults.h"

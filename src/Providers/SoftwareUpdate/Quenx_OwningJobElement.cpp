@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "Providers/SoftwareUpdate/Quenx_OwningJobElement.h"
 
 #include "Framework/Classes/CimBroker.h"

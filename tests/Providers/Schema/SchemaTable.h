@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #pragma once
 
 /// One class of the schema, as the DMTF's declarations and the rule of repetition make it; kept apart from

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The three methods on one inventory: the files of the test's folder are the identities.
 #include <gtest/gtest.h>
 

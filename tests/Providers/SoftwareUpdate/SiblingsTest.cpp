@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // What the update provider makes of instances that another provider serves in the inventory's classes.
 #include <gtest/gtest.h>
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "Utils/Os/Linux/FileLock.h"
 
 #include <fcntl.h>

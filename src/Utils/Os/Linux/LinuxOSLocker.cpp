@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "Utils/Os/Linux/LinuxOSLocker.h"
 
 #include "Utils/Log.h"
