@@ -45,7 +45,7 @@ void requireOk(const HttpReply& reply) {
             return;
         case 401:
             throw Failure(ExitStatus::Failed, "The server does not accept the user name and password.",
-                          "Give them with --user and the environment variable QUENXCTL_PASSWORD.");
+                          "Check --user or QUENXCTL_USER, and QUENXCTL_PASSWORD or what was typed.");
         case 403:
             throw Failure(
                 ExitStatus::Failed, "This user may not use the server.",
