@@ -22,10 +22,17 @@ std::string environmentOr(const char* variable, const char* otherwise) {
     return value != nullptr && *value != '\0' ? value : otherwise;
 }
 
+/// Whoever reads of a mistake in the file has not necessarily named it.
+std::shared_ptr<Backend> makeNamedBackend(const std::string& description, const std::string& state) try {
+    return std::make_shared<Simulator>(description, state);
+} catch (const AdapterError& error) {
+    throw AdapterError(kDescriptionVariable + std::string(": ") + error.what());
+}
+
 std::shared_ptr<Backend> makeDefaultBackend() {
     const std::string description = environmentOr(kDescriptionVariable, "");
     const std::string state = environmentOr(kStateVariable, kDefaultState);
-    if (!description.empty()) return std::make_shared<Simulator>(description, state);
+    if (!description.empty()) return makeNamedBackend(description, state);
     // A machine without simulated adapters has no description, and no adapters; that is not a mistake.
     if (::access(kDefaultDescription, F_OK) == 0)
         return std::make_shared<Simulator>(kDefaultDescription, state);

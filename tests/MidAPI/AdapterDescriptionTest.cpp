@@ -80,6 +80,7 @@ TEST(AdapterDescriptionTest, NamesMistakesWithPlaceAndRemedy) {
         {"\xEF\xBB\xBF# \xC3\xA4\na=['\xC3\xA4#', \"\\\"\xC3\xA4'\", \"\"\"\n\xC3\xA4\"\"\"]",
          "line 2: adapter description: unknown key"},
         {"[[adapter]]", "line 1: adapter 1: \"name\" is missing; write for example name = \"eth0\""},
+        {"[[adapter]]\nnmae = \"x\"", "line 2: adapter 1: unknown key \"nmae\"; the keys are name, "},
         {"[[adapter]]\nname = 7", "line 2: adapter 1: \"name\" must be a text in quotes"},
         {"[[adapter]]\nname = \"a\\nb\"", "\"name\" is \"a?b\""},
         {adapterAt("03"), "must be like \"0000:03:00.0\""},

@@ -145,6 +145,8 @@ void readPlace(const TomlTable& table, AdapterDescription& adapter) {
 /// The name first: every other mistake is then told with it.
 AdapterDescription readAdapter(const toml::table& node, const TomlTable& top, std::size_t number) {
     const TomlTable unnamed = top.inner(node, "adapter " + std::to_string(number));
+    // A name that seems to be missing may be there under a misspelt key.
+    if (!node.contains("name")) unnamed.allowOnly(kAdapterKeys);
     AdapterDescription adapter;
     adapter.name = unnamed.requiredText("name", "eth0");
     if (!isGoodName(adapter.name))
