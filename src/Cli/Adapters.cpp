@@ -80,12 +80,16 @@ std::vector<Adapter> readAdapters(Management& management) {
     return adapters;
 }
 
+std::string adviceForNoAdapters(const Management& management) {
+    if (!management.runsJobs()) return {};
+    return "Describe simulated ones in /etc/quenx-adapters.toml, or in a file that --adapters or "
+           "QUENX_ADAPTERS names.";
+}
+
 Adapter findAdapter(Management& management, const std::string& target) {
     const std::vector<Adapter> adapters = readAdapters(management);
     if (adapters.empty()) {
-        throw Failure(
-            ExitStatus::NotFound, "There are no adapters.",
-            management.runsJobs() ? "Describe simulated ones in a file and name it with --adapters." : "");
+        throw Failure(ExitStatus::NotFound, "There are no adapters.", adviceForNoAdapters(management));
     }
     const core::CimPath asPath(target);
     const std::optional<core::CimPath> path =

@@ -33,6 +33,9 @@ struct Adapter {
 /// All Ethernet ports with what is installed on them, in the model's order.
 std::vector<Adapter> readAdapters(Management& management);
 
+/// What to do where there are no adapters; empty for a server, which has its own.
+std::string adviceForNoAdapters(const Management& management);
+
 /// What is installed on a port.
 std::vector<Component> readComponents(Management& management, const core::CimPath& port);
 

@@ -31,9 +31,8 @@ ExitStatus showAdapters(Context& context) {
     }
     if (adapters.empty()) {
         context.out << "There are no adapters.\n";
-        if (context.management.runsJobs()) {
-            context.out << "Describe simulated ones in a file and name it with --adapters.\n";
-        }
+        const std::string advice = adviceForNoAdapters(context.management);
+        if (!advice.empty()) context.out << advice << '\n';
         return ExitStatus::Done;
     }
     std::vector<std::vector<std::string>> rows = {

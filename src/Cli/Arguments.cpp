@@ -5,6 +5,7 @@
 #include <algorithm>
 #include <iostream>
 #include <memory>
+#include <set>
 #include <string_view>
 
 #include "Cli/Failure.h"
@@ -22,7 +23,7 @@ namespace {
 constexpr const char* FOOTER =
     "Exit status:\n"
     "  0  done\n"
-    "  1  failed or refused: the message says what happened and what to do next\n"
+    "  1  failed or refused: the message says what happened, and what to do next where that helps\n"
     "  2  wrong use: the command line itself is wrong, or a file that an option names cannot be used\n"
     "  3  already current: what was to be installed is what is installed (see --force)\n"
     "  4  not found: there is no such adapter, image file, identity, job, class or instance\n";
@@ -49,12 +50,14 @@ void addServerOptions(CLI::App& app, Arguments& arguments, const std::vector<CLI
     for (CLI::Option* option : localOptions)
         option->excludes(url);
     app.add_option("--user", server.user,
-                   "User on the server; the password is taken from QUENXCTL_PASSWORD or asked for")
-        ->envname("QUENXCTL_USER")
-        ->type_name("NAME");
+                   "User on the server (default: QUENXCTL_USER, else asked for); the password is taken from "
+                   "QUENXCTL_PASSWORD or asked for")
+        ->type_name("NAME")
+        ->needs(url);
     app.add_option("--namespace", server.namespaceName, "Namespace on the server")
         ->type_name("NAME")
-        ->capture_default_str();
+        ->capture_default_str()
+        ->needs(url);
     CLI::Option* trusted = app.add_option("--cacert", server.caFile, "Trust the certificates in this file")
                                ->type_name("FILE")
                                ->needs(url);
@@ -207,13 +210,48 @@ Failure unknownVerb(const CLI::App& app, const std::string& name) {
     return {ExitStatus::WrongUse, "There is no verb \"" + name + "\".", didYouMean(name, names) + ASK_HELP};
 }
 
+std::string askHelpOf(const CLI::App& verb) {
+    return "\"quenxctl help " + verb.get_name() + "\" lists what it takes.";
+}
+
+bool isLongOption(const std::string& word) {
+    return word.size() > 2 && word.starts_with("--");
+}
+
+/// The long options that could have been meant: those of the verb, or of every verb where none was read.
+std::vector<std::string> optionsOf(const CLI::App& app, const CLI::App* verb) {
+    std::vector<const CLI::App*> takers = verb == nullptr ? verbsOf(app) : std::vector{verb};
+    takers.push_back(&app);
+    std::set<std::string> names;
+    for (const CLI::App* taker : takers) {
+        for (const CLI::Option* option : taker->get_options()) {
+            for (const std::string& name : option->get_lnames())
+                names.insert("--" + name);
+        }
+    }
+    return {names.begin(), names.end()};
+}
+
+/// A misspelt option is the cause of what the library tells first: that another is missing.
+std::optional<Failure> unknownOption(const CLI::App& app, const CLI::App* verb) {
+    const std::vector<std::string> rest = app.remaining(true);
+    const auto word = std::find_if(rest.begin(), rest.end(), isLongOption);
+    // Behind an unknown verb, options may be right for the verb that was meant.
+    if (word == rest.end() || (verb == nullptr && word != rest.begin())) return std::nullopt;
+    const std::string name = word->substr(0, word->find('='));
+    const std::vector<std::string> known = optionsOf(app, verb);
+    if (std::find(known.begin(), known.end(), name) != known.end()) return std::nullopt;
+    const std::string subject = verb == nullptr ? "There is" : "\"" + verb->get_name() + "\" has";
+    return Failure(ExitStatus::WrongUse, subject + " no option \"" + name + "\".",
+                   didYouMean(name, known) + (verb == nullptr ? ASK_HELP : askHelpOf(*verb)));
+}
+
 /// The library only says that a verb is missing, both where there is none and where it is unknown.
 Failure wrongUse(const CLI::App& app, const CLI::ParseError& error) {
     const auto verbs = app.get_subcommands();
-    if (!verbs.empty()) {
-        return {ExitStatus::WrongUse, std::string(error.what()) + ".",
-                "\"quenxctl help " + verbs.front()->get_name() + "\" lists what it takes."};
-    }
+    const CLI::App* verb = verbs.empty() ? nullptr : verbs.front();
+    if (const std::optional<Failure> unknown = unknownOption(app, verb)) return *unknown;
+    if (verb != nullptr) return {ExitStatus::WrongUse, std::string(error.what()) + ".", askHelpOf(*verb)};
     const std::vector<std::string> rest = app.remaining();
     if (error.get_name() != "RequiredError")
         return {ExitStatus::WrongUse, error.what() + std::string("."), ASK_HELP};

@@ -38,15 +38,15 @@ std::unique_ptr<Management> openManagement(const Arguments& arguments) {
         std::cerr << "quenxctl: WARNING: --insecure: the server's certificate is not checked. Anybody on the "
                      "network path can read the password and pose as the server.\n";
     }
-    if (server.user.empty()) server.user = askUser();
+    if (server.user.empty()) server.user = userName();
     server.password = passwordOf(server.user);
     return std::make_unique<RemoteManagement>(url, server);
 }
 
-std::string adviceFor(core::CimStatus status) {
-    switch (status) {
+std::string adviceFor(const core::CimError& error) {
+    switch (error.status()) {
         case core::CimStatus::InvalidClass:
-            return "\"quenxctl mof\" prints the classes that are served.";
+            return ASK_MOF;
         case core::CimStatus::InvalidParameter:
         case core::CimStatus::NotFound:
             return "\"quenxctl instances CLASS --names\" prints the paths of what there is.";
@@ -57,7 +57,10 @@ std::string adviceFor(core::CimStatus status) {
         case core::CimStatus::ServerIsShuttingDown:
             return "Try again after its restart.";
         default:
-            return ASK_LOG;
+            // The adapters then say what is wrong with their description.
+            return std::string_view(error.what()).starts_with("QUENX_ADAPTERS")
+                       ? "Correct QUENX_ADAPTERS or the file that it names."
+                       : ASK_LOG;
     }
 }
 
@@ -109,7 +112,7 @@ ExitStatus runAndReport(int argc, char** argv, std::optional<Arguments>& argumen
     } catch (const Failure& failure) {
         return report(json, failure.status(), failure.what(), failure.advice());
     } catch (const core::CimError& error) {
-        return report(json, statusFor(error.status()), sentence(error.what()), adviceFor(error.status()));
+        return report(json, statusFor(error.status()), sentence(error.what()), adviceFor(error));
     } catch (const std::exception& error) {
         return report(json, ExitStatus::Failed, sentence(error.what()), ASK_LOG);
     }

@@ -26,7 +26,9 @@ std::string ask(const std::string& prompt, const std::string& missing, const std
 
 }  // namespace
 
-std::string askUser() {
+std::string userName() {
+    const char* given = std::getenv("QUENXCTL_USER");
+    if (given != nullptr && *given != '\0') return given;
     return ask("User: ", "No user name was given.",
                "Name the user with --user or the environment variable QUENXCTL_USER.");
 }

@@ -2,6 +2,8 @@
 #include "Cli/Explanation.h"
 
 #include <algorithm>
+#include <cerrno>
+#include <system_error>
 
 #include "Cli/Busyness.h"
 #include "Cli/ImageUri.h"
@@ -149,6 +151,15 @@ std::string readBackText(const Candidate& candidate, const std::vector<Component
     return isTelling ? "It keeps its old firmware." : "It reports the same versions as before.";
 }
 
+/// Simulated adapters keep their flash in files, which not every user may write.
+std::string permissionAdvice(const std::string& reason) {
+    for (const int error : {EACCES, EPERM, EROFS}) {
+        if (reason.find(std::generic_category().message(error)) != std::string::npos)
+            return "Run quenxctl as root, or name a folder of yours with --adapters FILE --state DIR.";
+    }
+    return {};
+}
+
 }  // namespace
 
 Explanation explainRefusal(Management& management, std::uint32_t returnValue, const Candidate& candidate) {
@@ -158,12 +169,15 @@ Explanation explainRefusal(Management& management, std::uint32_t returnValue, co
     return found.message.empty() ? explainReturnValue(returnValue) : found;
 }
 
-Explanation explainFailedJob(const JobView& job, const Candidate& candidate,
+Explanation explainFailedJob(const Management& management, const JobView& job, const Candidate& candidate,
                              const std::vector<Component>& after) {
     const std::string reason = job.errorDescription.empty() ? "no reason was given" : job.errorDescription;
+    std::string next = readBackText(candidate, after);
+    const std::string advice = management.runsJobs() ? permissionAdvice(reason) : "";
+    if (!next.empty() && !advice.empty()) next += ' ';
     return {"The update of " + candidate.adapter.name + " failed: " + reason + " (error " +
                 std::to_string(job.errorCode) + ").",
-            readBackText(candidate, after)};
+            next + advice};
 }
 
 }  // namespace cli

@@ -17,7 +17,7 @@ Explanation explainRefusal(Management& management, std::uint32_t returnValue, co
 
 /// Why a job that was started did not complete, in the device's words.
 /// @param after  what the adapter carries now; empty when that could not be read
-Explanation explainFailedJob(const JobView& job, const Candidate& candidate,
+Explanation explainFailedJob(const Management& management, const JobView& job, const Candidate& candidate,
                              const std::vector<Component>& after);
 
 }  // namespace cli

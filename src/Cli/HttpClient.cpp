@@ -39,7 +39,8 @@ std::size_t takeHeader(char* data, std::size_t, std::size_t count, void* to) {
     return count;
 }
 
-std::string adviceFor(CURLcode code) {
+/// @param isEncrypted  whether the request was
+std::string adviceFor(CURLcode code, bool isEncrypted) {
     switch (code) {
         case CURLE_PEER_FAILED_VERIFICATION:
             return "Name the server's certificate, or the one that signed it, with --cacert.";
@@ -49,6 +50,10 @@ std::string adviceFor(CURLcode code) {
         case CURLE_COULDNT_RESOLVE_HOST:
         case CURLE_OPERATION_TIMEDOUT:
             return "Check that the server runs and that --server names its host and port.";
+        case CURLE_GOT_NOTHING:
+        case CURLE_RECV_ERROR:
+            if (!isEncrypted) return "The port may be one for HTTPS: try https:// in --server.";
+            [[fallthrough]];
         default:
             return "Check --server.";
     }
@@ -130,7 +135,8 @@ HttpReply HttpClient::post(const std::vector<std::string>& headers, const std::s
     if (code != CURLE_OK) {
         const char* reason = handle_->error[0] == '\0' ? curl_easy_strerror(code) : handle_->error;
         const auto status = code == CURLE_SSL_CACERT_BADFILE ? ExitStatus::WrongUse : ExitStatus::Failed;
-        throw Failure(status, "The request to " + url_ + " failed: " + reason + ".", adviceFor(code));
+        throw Failure(status, "The request to " + url_ + " failed: " + reason + ".",
+                      adviceFor(code, url_.starts_with("https:")));
     }
     curl_easy_getinfo(handle_->curl, CURLINFO_RESPONSE_CODE, &reply.status);
     return reply;

@@ -29,10 +29,10 @@ bool isInPlace(const Candidate& candidate, const std::vector<Component>& after) 
     });
 }
 
-void judgeJob(InstallOutcome& outcome, const Candidate& candidate) {
+void judgeJob(const Management& management, InstallOutcome& outcome, const Candidate& candidate) {
     const std::string& name = candidate.adapter.name;
     if (!outcome.job->hasSucceeded()) {
-        outcome.end("failed", explainFailedJob(*outcome.job, candidate, outcome.after));
+        outcome.end("failed", explainFailedJob(management, *outcome.job, candidate, outcome.after));
     } else if (!isInPlace(candidate, outcome.after)) {
         outcome.end("failed", {"The update of " + name + " ended without an error, but " + name + " has " +
                                    componentsText(outcome.after) + ", not what the image has.",
@@ -67,7 +67,7 @@ void followUpdate(Context& context, const core::CimPath& job, const Candidate& c
     outcome.job = followJob(context.management, job, context.observer, context.following);
     outcome.job->adapter = candidate.adapter.name;
     outcome.after = readBack(context.management, candidate);
-    judgeJob(outcome, candidate);
+    judgeJob(context.management, outcome, candidate);
 }
 
 ExitStatus runInstall(Context& context, const Candidate& candidate, const Start& start) {

@@ -51,5 +51,7 @@ struct AssociatorsOrder {
 ExitStatus showAssociators(Context& context, const AssociatorsOrder& order);
 
 ExitStatus showMof(Context& context);
+/// What to do about a class that is not served.
+inline constexpr const char* ASK_MOF = "\"quenxctl mof\" prints the classes that are served.";
 
 }  // namespace cli

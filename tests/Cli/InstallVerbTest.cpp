@@ -153,21 +153,35 @@ TEST_F(InstallVerb, AfterAFailureOnlySaysWhatWasReadBack) {
     const struct {
         std::vector<InstanceValue> installed;
         bool isReadable;
+        std::string reason;
         std::string advice;
     } rows[] = {
-        {{component("IMG_PXE", 1), component("IMG_UEFI", 0)}, true, "It keeps its old firmware.\n"},
-        {{component("IMG_PXE", 2), component("IMG_UEFI", 0)}, true, "It now has IMG_PXE 2, IMG_UEFI 0.\n"},
-        {{component("IMG_PXE", 1), component("IMG_UEFI", 0)}, false, ""},
+        {{component("IMG_PXE", 1), component("IMG_UEFI", 0)},
+         true,
+         "cannot make the folder /x: Permission denied",
+         "It keeps its old firmware. Run quenxctl as root, or name a folder of yours with --adapters FILE "
+         "--state DIR.\n"},
+        {{component("IMG_PXE", 1), component("IMG_UEFI", 0)},
+         true,
+         "flash gone",
+         "It keeps its old firmware.\n"},
+        {{component("IMG_PXE", 2), component("IMG_UEFI", 0)},
+         true,
+         "flash gone",
+         "It now has IMG_PXE 2, IMG_UEFI 0.\n"},
+        {{component("IMG_PXE", 1), component("IMG_UEFI", 0)}, false, "flash gone", ""},
     };
     for (const auto& row : rows) {
         model_.jobs = {job(10, 100)};
+        model_.jobs.back().properties.push_back(
+            {"ErrorDescription", CimValue::of(CimType::String, row.reason), false, {}});
         model_.installed = {component("IMG_PXE", 1), component("IMG_UEFI", 0)};
         model_.installedAfterJob = row.installed;
         model_.isReadable = row.isReadable;
         error_.str("");
         EXPECT_EQ(install(), ExitStatus::Failed);
         EXPECT_EQ(error_.str(),
-                  "quenxctl: The update of eth0 failed: no reason was given (error 0).\n" + row.advice);
+                  "quenxctl: The update of eth0 failed: " + row.reason + " (error 0).\n" + row.advice);
     }
     // A success stays one.
     model_.jobs = {job(7, 100)};

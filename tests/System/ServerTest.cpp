@@ -125,6 +125,10 @@ TEST_F(Server, RefusesWhomItCannotTrust) {
     const ProgramResult wrong = quenxctl({"adapters"}, "guess");
     EXPECT_EQ(wrong.status, 1);
     EXPECT_TRUE(contains(wrong.error, "does not accept the user name and password.")) << wrong.error;
+    const std::string mistaken = "http://127.0.0.1:" + std::to_string(daemon_.httpsPort());
+    const ProgramResult plain = test::run({QUENXCTL, "--server", mistaken, "adapters"},
+                                          {"QUENXCTL_USER=admin", "QUENXCTL_PASSWORD=admin"});
+    EXPECT_TRUE(contains(plain.error, "try https:// in --server.")) << plain.error;
     // No other host than this one, and nobody who would answer.
     const ProgramResult clear = test::run(
         {QUENXCTL, "--server", "http://0.0.0.0:1", "--user", "a", "adapters"}, {"QUENXCTL_PASSWORD=a"});

@@ -104,11 +104,22 @@ TEST_F(WrongUse, OtherAdaptersAndNames) {
         {{"install", "--target", "eth0"}, 2, "name one image"},
         {{"install", "--target", "eth0", image_, "--identity", "x"}, 2, "name one image"},
         {{"install", image_}, 2, "--target is required"},
+        {{"install", "--traget=eth0", image_},
+         2,
+         "\"install\" has no option \"--traget\".\nDid you mean --target? \"quenxctl help install\""},
+        {{"adapters", "--target", "eth0"}, 2, "\"adapters\" has no option \"--target\"."},
+        {{"--jsno"}, 2, "There is no option \"--jsno\".\nDid you mean --json? "},
+        {{"isntall", "--traget", "eth0"}, 2, "There is no verb \"isntall\"."},
+        {{"adapters", "--user", "a"}, 2, "--user requires --server"},
+        {{"adapters", "--namespace", "root/cimv2"}, 2, "--namespace requires --server"},
         {{"frobnicate"}, 2, "There is no verb \"frobnicate\".\n\"quenxctl --help\" lists"},
         {{"isntall"}, 2, "There is no verb \"isntall\".\nDid you mean install? "},
         {{"help", "jbos"}, 2, "There is no verb \"jbos\".\nDid you mean jobs? "},
         {{}, 2, "No verb was given."},
-        {{"instances", "No_Such"}, 4, "\"quenxctl mof\" prints the classes"},
+        {{"instances", "No_Such"}, 4, "served.\n\"quenxctl mof\" prints the classes"},
+        {{"instances", "Quenx_EthernetProt", "--names"},
+         4,
+         "No class \"Quenx_EthernetProt\" is served.\nDid you mean Quenx_EthernetPort? \"quenxctl mof\""},
         {{"adapters", "--server", ""}, 2, "--server \"\" does not begin with https:// or http://."},
         {{"adapters", "--server", "127.0.0.1:5989"}, 2, "Write it as https://host:5989."},
         {{"adapters", "--server", "https://a:b@host"}, 2, "Name the user with --user"},
@@ -122,6 +133,14 @@ TEST_F(WrongUse, OtherAdaptersAndNames) {
     // No bad input: the empty name after the plus sign asks for no type at all.
     EXPECT_EQ(quenxctl({"install", "--target", "eth0", image_, "--types", "IMG_PXE+"}).status, 0);
 
+    EXPECT_EQ(quenxctl({"adapters"}, {"QUENXCTL_USER=a"}).status, 0) << "set for whenever there is a server";
+
+    const std::string none = folder_ / "none.toml";
+    const ProgramResult named =
+        test::run({QUENXCTL, "--config", configuration_, "adapters"}, {"QUENX_ADAPTERS=" + none});
+    EXPECT_EQ(named.error,
+              "quenxctl: QUENX_ADAPTERS: there is no adapter description " + none +
+                  "; name a readable file.\nCorrect QUENX_ADAPTERS or the file that it names.\n");
     folder_.write("adapters.toml", "[[adapter]]\nname = \"eth0\"\nspeeed = 1\n");
     expectError({"adapters"}, 2, "adapters.toml, line ");
 }
