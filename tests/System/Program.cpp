@@ -103,7 +103,8 @@ void Program::type(const std::string& keys) {
 }
 
 void Program::send(int signal) {
-    kill(child_, signal);
+    // After finish() there is no child, and kill() would take -1 for every process there is.
+    if (child_ > 0) kill(child_, signal);
 }
 
 void Program::closeOutput() {
