@@ -25,7 +25,7 @@ std::optional<JobView> runningJob(Management& management) {
 Explanation explainUnseen(std::uint32_t returnValue, const Candidate& candidate) {
     constexpr const char* HOLDER = ": an earlier check may hold it, or an update whose job was deleted.";
     const std::string& name = candidate.adapter.name;
-    if (returnValue == RETURN_TARGET_IN_USE) {
+    if (returnValue == MethodReturn::InUse) {
         return {"The server refuses " + name + ", although no job is running" + HOLDER, WAIT_OR_RESTART};
     }
     if (candidate.image && !candidate.image->isIntact()) return {};
@@ -37,7 +37,8 @@ Explanation explainUnseen(std::uint32_t returnValue, const Candidate& candidate)
 }  // namespace
 
 Explanation explainBusyness(Management& management, std::uint32_t returnValue, const Candidate& candidate) {
-    const bool mayBeBusy = returnValue == RETURN_TARGET_IN_USE || returnValue == RETURN_UNSPECIFIED;
+    const bool mayBeBusy =
+        returnValue == MethodReturn::InUse || returnValue == MethodReturn::UnspecifiedError;
     if (!mayBeBusy || management.runsJobs()) return {};
     const std::optional<JobView> job = runningJob(management);
     if (!job) return explainUnseen(returnValue, candidate);

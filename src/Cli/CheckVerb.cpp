@@ -18,7 +18,7 @@ ExitStatus judge(Context& context, const Candidate& candidate, std::uint32_t ret
     InstallOutcome outcome(candidate);
     outcome.returnValue = returnValue;
     outcome.advice = holdAfterCheck(context.management, candidate.adapter.name);
-    if (returnValue != RETURN_COMPLETED) {
+    if (returnValue != MethodReturn::Completed) {
         outcome.end("refused", explainRefusal(context.management, returnValue, candidate));
     } else if (!candidate.force && isAlreadyCurrent(candidate)) {
         outcome.status = ExitStatus::AlreadyCurrent;

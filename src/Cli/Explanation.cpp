@@ -125,17 +125,17 @@ Explanation explainNotApplicable(const Candidate& candidate) {
 
 Explanation find(const Management& management, std::uint32_t returnValue, const Candidate& candidate) {
     switch (returnValue) {
-        case RETURN_UNSPECIFIED:
-        case RETURN_INVALID_PARAMETER: {
-            const bool isOnServer = returnValue == RETURN_INVALID_PARAMETER && !management.runsJobs();
+        case MethodReturn::UnspecifiedError:
+        case MethodReturn::InvalidParameter: {
+            const bool isOnServer = returnValue == MethodReturn::InvalidParameter && !management.runsJobs();
             const Explanation found = isOnServer ? explainServersFile(candidate) : Explanation();
             return found.message.empty() ? explainFile(candidate) : found;
         }
-        case RETURN_UNSUPPORTED_TARGET:
+        case MethodReturn::UnsupportedTargetType:
             return explainUnsupported(candidate);
-        case RETURN_DOWNGRADE:
+        case MethodReturn::DowngradeNotSupported:
             return explainDowngrade(candidate);
-        case RETURN_NOT_APPLICABLE:
+        case MethodReturn::NotApplicable:
             return explainNotApplicable(candidate);
         default:
             return {};

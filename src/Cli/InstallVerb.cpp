@@ -84,7 +84,7 @@ ExitStatus runInstall(Context& context, const Candidate& candidate, const Start&
     }
     const core::MethodResult result = start();
     outcome.returnValue = result.returnValue;
-    if (result.returnValue == RETURN_JOB_STARTED) {
+    if (result.returnValue == MethodReturn::JobStarted) {
         followUpdate(context, jobOf(result), candidate, outcome);
     } else {
         outcome.end("refused", explainRefusal(context.management, result.returnValue, candidate));

@@ -7,18 +7,10 @@
 #include <vector>
 
 #include "Cli/Management.h"
+#include "Providers/Schema/ValueMaps.h"
 #include "Utils/Time.h"
 
 namespace cli {
-
-/// States of a job (the DMTF's value map of CIM_ConcreteJob.JobState) that the program tells apart.
-enum JobState : std::uint16_t {
-    JOB_RUNNING = 4,
-    JOB_COMPLETED = 7,
-    JOB_TERMINATED = 8,
-    JOB_KILLED = 9,
-    JOB_EXCEPTION = 10,
-};
 
 /// A job as it was when it was read.
 struct JobView {
@@ -33,8 +25,8 @@ struct JobView {
     std::string errorDescription;
 
     /// No further change will come.
-    bool hasEnded() const { return state >= JOB_COMPLETED && state <= JOB_EXCEPTION; }
-    bool hasSucceeded() const { return state == JOB_COMPLETED; }
+    bool hasEnded() const { return state >= JobStateCompleted && state <= JobStateException; }
+    bool hasSucceeded() const { return state == JobStateCompleted; }
     /// What is done for certain. A job that failed reports 100 % and tells nothing; one that runs is not
     /// done.
     std::optional<unsigned> certainPercent() const;

@@ -1,13 +1,11 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Host/Daemon/RunningJobs.h"
 
+#include "Providers/Schema/ValueMaps.h"
+
 namespace host {
 
 namespace {
-
-// JobState of CIM_ConcreteJob.
-constexpr std::uint64_t kStarting = 3;
-constexpr std::uint64_t kRunning = 4;
 
 template <class T>
 T valueOf(const core::InstanceValue& instance, std::string_view name) {
@@ -24,7 +22,7 @@ std::vector<RunningJob> runningJobs(core::CimOperations& operations) {
     try {
         for (const core::InstanceValue& job : operations.enumerateInstances("CIM_ConcreteJob")) {
             const auto state = valueOf<std::uint64_t>(job, "JobState");
-            if (state != kStarting && state != kRunning) continue;
+            if (state != JobStateStarting && state != JobStateRunning) continue;
             running.push_back(
                 {valueOf<std::string>(job, "InstanceID"), valueOf<std::uint64_t>(job, "PercentComplete")});
         }
