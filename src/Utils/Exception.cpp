@@ -29,8 +29,7 @@ const char* Exception::what() const noexcept {
     return m_message.c_str();
 }
 
-EUnspecifiedError::EUnspecifiedError(const std::string& message)
-    : Exception("EUnspecifiedError:" + message) {}
+EUnspecifiedError::EUnspecifiedError(std::string message) : Exception("EUnspecifiedError:" + message) {}
 
 EUnspecifiedError::~EUnspecifiedError() noexcept = default;
 

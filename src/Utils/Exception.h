@@ -34,7 +34,7 @@ class QUENX_EXPORT Exception : public std::exception {
 /// failure, so it is known to all floors.
 class QUENX_EXPORT EUnspecifiedError : public Exception {
   public:
-    explicit EUnspecifiedError(const std::string& message);
+    explicit EUnspecifiedError(std::string message);
     EUnspecifiedError(const EUnspecifiedError&) = default;
     EUnspecifiedError& operator=(const EUnspecifiedError&) = default;
     ~EUnspecifiedError() noexcept override;
