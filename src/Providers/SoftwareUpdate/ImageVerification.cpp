@@ -45,8 +45,9 @@ void appendTargetTypes(const std::string& value, std::vector<utils::FirmwareType
     }
 }
 
-/// What Quenx_ConcreteJob::getTargetTypes() returns, without a word about the claim.
-std::vector<utils::FirmwareType> requestedTypes(const std::vector<std::uint16_t>& options,
+/// What Quenx_ConcreteJob::getTargetTypes() returns, without a word about the claim. Named like it, since the
+/// log names the function.
+std::vector<utils::FirmwareType> getTargetTypes(const std::vector<std::uint16_t>& options,
                                                 const std::vector<std::string>& values) {
     std::vector<utils::FirmwareType> types;
     QUENX_DEBUG("InstallOptions Size: %d", static_cast<int>(options.size()));
@@ -146,7 +147,7 @@ PreparedImage examineImage(const std::string& adapterName, const std::string& ur
     const auto fileSize = static_cast<std::uint32_t>(os::getFileSize(path));
     const Buffer source = readImage(uri, path, fileSize);
     PreparedImage image{std::make_unique_for_overwrite<std::uint8_t[]>(fileSize), fileSize,
-                        requestedTypes(installOptions, installOptionValues)};
+                        getTargetTypes(installOptions, installOptionValues)};
 
     QUENX_DEBUG("Start preparing the image");
     const int status = ma::prepareFlashImage(adapterName, source.get(), fileSize, image.bytes.get(),
@@ -185,7 +186,7 @@ VerifiedImage verifyImage(const std::string& adapterName, const std::string& uri
 std::vector<utils::FirmwareType> Quenx_ConcreteJob::getTargetTypes(
     std::vector<std::uint16_t>& installOptions, std::vector<std::string>& installOptionValues) {
     try {
-        return requestedTypes(installOptions, installOptionValues);
+        return ::getTargetTypes(installOptions, installOptionValues);
     } catch (const utils::EInvalidParameter&) {
         AdapterClaim(m_servicedAdapter).release();
         throw;
