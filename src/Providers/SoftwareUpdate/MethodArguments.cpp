@@ -53,10 +53,15 @@ std::string firstPortOf(const core::CimInstance& controllerInstance) {
 /// counts: clients have come to rely on it.
 std::string findUri(const std::string& identifier) {
     std::string uri;
-    for (const core::CimInstance* each : findInstances("Quenx_SoftwareIdentityResource")) {
-        const auto* resource = dynamic_cast<const inventory::SoftwareIdentityResource*>(each);
-        if (resource != nullptr && resource->getFirmwareFileID() == identifier)
-            uri = resource->getAccessInfo();
+    try {
+        for (const core::CimInstance* each : findInstances("Quenx_SoftwareIdentityResource")) {
+            const auto* resource = dynamic_cast<const inventory::SoftwareIdentityResource*>(each);
+            if (resource != nullptr && resource->getFirmwareFileID() == identifier)
+                uri = resource->getAccessInfo();
+        }
+    } catch (...) {
+        // To a client, a resource that cannot say where its file is has no file.
+        return {};
     }
     return uri;
 }
