@@ -29,7 +29,15 @@ for argument in "$@"; do
             echo "$0: unknown option $argument (see --help)" >&2
             exit 2
             ;;
-        *) presets+=("$argument") ;;
+        *)
+            case " ${all_presets[*]} " in
+                *" $argument "*) presets+=("$argument") ;;
+                *)
+                    echo "$0: unknown preset $argument. Name some of: ${all_presets[*]}" >&2
+                    exit 2
+                    ;;
+            esac
+            ;;
     esac
 done
 if [ "${#presets[@]}" = 0 ]; then

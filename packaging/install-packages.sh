@@ -13,6 +13,13 @@ if [ "${1:-}" = --check ]; then
     shift
 fi
 
+for group in "$@"; do
+    if ! grep -q "^$group " "$list"; then
+        echo "$0: unknown group $group. Name some of: $(grep -v '^#' "$list" | cut -d ' ' -f 1 | uniq | tr '\n' ' ')" >&2
+        exit 2
+    fi
+done
+
 wanted() {
     local group package
     while read -r group package; do

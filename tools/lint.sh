@@ -16,8 +16,12 @@ case "${1:-}" in
     --all) list="$(all)" ;;
     --staged) list="$(since --cached)" ;;
     -h | --help)
-        sed -n '2,8s/^# \{0,1\}//p' "$0"
+        sed -n '3,8s/^# \{0,1\}//p' "$0"
         exit 0
+        ;;
+    -*)
+        echo "$0: unknown option $1 (see --help)" >&2
+        exit 2
         ;;
     "") list="$(since "$(git merge-base main HEAD)")" ;;
     *) list="$(printf '%s\n' "$@")" ;;
