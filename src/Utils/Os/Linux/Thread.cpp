@@ -2,6 +2,7 @@
 #include "Utils/Os/Linux/Thread.h"
 
 #include <cxxabi.h>
+#include <signal.h>
 
 #include <cerrno>
 #include <ctime>
@@ -32,6 +33,27 @@ class InExecute {
     IntThreadData& m_data;
 };
 
+/// Keeps signals from a thread that is started meanwhile, which inherits the mask. They belong to the threads
+/// of the hosting program: a worker that waits in the kernel would answer them late, or interrupt a write to
+/// a flash.
+class SignalsBlocked {
+  public:
+    SignalsBlocked() {
+        sigset_t signals;
+        sigfillset(&signals);
+        // What a thread's own mistakes raise stays, or nobody would learn where the mistake is.
+        for (const int fault : {SIGSEGV, SIGBUS, SIGFPE, SIGILL, SIGTRAP, SIGABRT, SIGSYS, SIGPROF})
+            sigdelset(&signals, fault);
+        pthread_sigmask(SIG_BLOCK, &signals, &m_before);
+    }
+    ~SignalsBlocked() { pthread_sigmask(SIG_SETMASK, &m_before, nullptr); }
+    SignalsBlocked(const SignalsBlocked&) = delete;
+    SignalsBlocked& operator=(const SignalsBlocked&) = delete;
+
+  private:
+    sigset_t m_before{};
+};
+
 void runBody(Thread& thread) {
     const void* const address = &thread;
     try {
@@ -54,6 +76,7 @@ Thread::~Thread() {
 }
 
 void Thread::start() {
+    const SignalsBlocked blocked;
     const int error =
         m_data->started ? EALREADY : pthread_create(&m_data->handle, nullptr, &thread_entry, this);
     if (error != 0) {

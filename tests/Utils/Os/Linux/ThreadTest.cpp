@@ -106,6 +106,23 @@ TEST_F(ThreadTest, AloneEndsOnAnExceptionOfTheBody) {
     waitUntil([] { return SyslogCapture::contains("ended by an unknown exception"); });
 }
 
+TEST_F(ThreadTest, LeavesSignalsToTheThreadsOfItsHost) {
+    std::atomic<int> asked{-1}, fault{-1};
+    Worker worker([&](Worker&) {
+        sigset_t blocked;
+        pthread_sigmask(SIG_BLOCK, nullptr, &blocked);
+        fault = sigismember(&blocked, SIGSEGV);
+        asked = sigismember(&blocked, SIGINT);
+    });
+    worker.start();
+    waitUntil([&] { return asked != -1; });
+    EXPECT_EQ(asked, 1);
+    EXPECT_EQ(fault, 0);
+    sigset_t own;
+    pthread_sigmask(SIG_BLOCK, nullptr, &own);
+    EXPECT_EQ(sigismember(&own, SIGINT), 0);
+}
+
 TEST_F(ThreadTest, RefusesASecondStart) {
     Worker worker([](Worker&) {});
     worker.start();
