@@ -6,6 +6,7 @@
 #include <pty.h>
 #include <signal.h>
 #include <sys/wait.h>
+#include <termios.h>
 #include <unistd.h>
 
 #include <array>
@@ -53,7 +54,14 @@ Program::Program(const std::vector<std::string>& command, Output output,
     if (output == Output::Terminal) {
         const winsize size{24, 100, 0, 0};
         child_ = forkpty(&out_, nullptr, nullptr, &size);
-        if (child_ == 0) become(command, environment);
+        if (child_ == 0) {
+            // Else Ctrl-C throws away what the program has just said and the test has not read yet.
+            termios mode{};
+            tcgetattr(STDIN_FILENO, &mode);
+            mode.c_lflag |= NOFLSH;
+            tcsetattr(STDIN_FILENO, TCSANOW, &mode);
+            become(command, environment);
+        }
         return;
     }
     std::array<int, 2> out{};

@@ -123,7 +123,7 @@ class SiblingsTest : public test::UpdateTest {
 TEST_F(SiblingsTest, AResourceThatThrowsHasNoUri) {
     failing = "getAccessInfo";
     EXPECT_EQ(check(m_image, m_port).returnValue, MethodReturn::InvalidParameter);
-    EXPECT_TRUE(logged("Could not obtain URI from the SoftwareIdentityResource"));
+    EXPECT_TRUE(test::SyslogCapture::contains("Could not obtain URI from the SoftwareIdentityResource"));
 }
 
 TEST_F(SiblingsTest, WhatTheyThrowIsAnUnspecifiedError) {
