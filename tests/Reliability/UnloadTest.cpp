@@ -117,8 +117,13 @@ TEST_F(UnloadTest, TheEndOfTheProcessWaitsForTheFlash) {
 /// What the plain host prints when it loads the libraries in this order and closes the one with that index
 /// first.
 std::string plainHost(const char* loadedFirst, const char* loadedSecond, int closedFirst) {
-    const std::string command = std::string(QUENX_PLAIN_HOST) + " " + loadedFirst + " " + loadedSecond + " " +
-                                QUENX_AGENT_COUNT + " " + std::to_string(closedFirst);
+    std::string command;
+    // The folder of the build may have blanks in its name.
+    for (const std::string& word :
+         {std::string(QUENX_PLAIN_HOST), std::string(loadedFirst), std::string(loadedSecond),
+          std::string(QUENX_AGENT_COUNT), std::to_string(closedFirst)}) {
+        command += "'" + word + "' ";
+    }
     const std::unique_ptr<std::FILE, int (*)(std::FILE*)> output(popen(command.c_str(), "r"), pclose);
     std::string text;
     for (int c = std::fgetc(output.get()); c != EOF; c = std::fgetc(output.get()))
