@@ -1,11 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "CimXml/ClassCodec.h"
-
 #include <algorithm>
 
+#include "CimXml/ElementCodec.h"
 #include "CimXml/Message.h"
-#include "CimXml/ValueReader.h"
-#include "CimXml/ValueWriter.h"
 
 namespace cimxml {
 
@@ -16,30 +13,14 @@ using core::Qualifier;
 
 // Reading.
 
-CimType typeOf(const pugi::xml_node& element) {
-    const auto type = core::typeByName(requiredAttribute(element, "TYPE"));
-    if (!type) refuseElement(element, "has an unknown type");
+CimType requireType(const pugi::xml_node& element) {
+    const auto type = readType(element, "TYPE");
+    if (!type) refuseElement(element, "has no attribute TYPE");
     return *type;
 }
 
 bool isTrue(const pugi::xml_attribute& attribute) {
     return core::sameName(attribute.value(), "true");
-}
-
-/// PROPERTY, PROPERTY.ARRAY, PROPERTY.REFERENCE and the four of PARAMETER differ by their suffix alone.
-struct Shape {
-    CimType type;
-    bool isArray;
-    std::string referenceClass;
-};
-
-Shape shapeOf(const pugi::xml_node& element) {
-    const std::string_view name = element.name();
-    const std::string_view suffix = name.substr(std::min(name.find('.'), name.size()));
-    if (suffix == ".REFERENCE" || suffix == ".REFARRAY") {
-        return {CimType::Reference, suffix == ".REFARRAY", element.attribute("REFERENCECLASS").value()};
-    }
-    return {typeOf(element), suffix == ".ARRAY", ""};
 }
 
 bool startsWith(const pugi::xml_node& element, std::string_view name) {
@@ -48,18 +29,15 @@ bool startsWith(const pugi::xml_node& element, std::string_view name) {
 
 Qualifier readQualifier(const pugi::xml_node& element) {
     // A QUALIFIER does not say whether it is an array, only its value does; null counts as a single one.
-    const RawValue raw = readValue(element, "TYPE", KeyTyping::ByAttributes);
-    const bool isArray = std::holds_alternative<std::vector<std::string>>(raw.data);
-    const auto value = typedValueOf(raw, typeOf(element), isArray);
+    auto value = readValue(element, requireType(element), std::nullopt, KeyTyping::ByAttributes);
     if (!value) refuseElement(element, "holds no value of its type");
-    return {requiredAttribute(element, "NAME"), *value, isTrue(element.attribute("PROPAGATED"))};
+    return {requiredAttribute(element, "NAME"), std::move(*value), isTrue(element.attribute("PROPAGATED"))};
 }
 
 std::vector<Qualifier> readQualifiers(const pugi::xml_node& element) {
     std::vector<Qualifier> qualifiers;
-    for (const pugi::xml_node& child : element.children("QUALIFIER")) {
+    for (const pugi::xml_node& child : element.children("QUALIFIER"))
         qualifiers.push_back(readQualifier(child));
-    }
     return qualifiers;
 }
 
@@ -70,38 +48,46 @@ bool isSet(const std::vector<Qualifier>& qualifiers, std::string_view name) {
     return flag != nullptr && *flag;
 }
 
+/// What properties and parameters have alike. PROPERTY, PROPERTY.ARRAY, PROPERTY.REFERENCE and the four of
+/// PARAMETER differ by their suffix alone.
+template <class Declaration>
+Declaration readTyped(const pugi::xml_node& element) {
+    const std::string_view name = element.name();
+    const std::string_view suffix = name.substr(std::min(name.find('.'), name.size()));
+    const bool isReference = suffix == ".REFERENCE" || suffix == ".REFARRAY";
+    Declaration declaration{};
+    declaration.name = requiredAttribute(element, "NAME");
+    declaration.type = isReference ? CimType::Reference : requireType(element);
+    declaration.isArray = suffix == ".ARRAY" || suffix == ".REFARRAY";
+    if (isReference) declaration.referenceClass = element.attribute("REFERENCECLASS").value();
+    declaration.qualifiers = readQualifiers(element);
+    return declaration;
+}
+
+template <class Declaration>
+void readOrigin(const pugi::xml_node& element, Declaration& declaration) {
+    declaration.origin = element.attribute("CLASSORIGIN").value();
+    declaration.isPropagated = isTrue(element.attribute("PROPAGATED"));
+}
+
 core::PropertyDeclaration readProperty(const pugi::xml_node& element) {
-    Shape shape = shapeOf(element);
-    std::vector<Qualifier> qualifiers = readQualifiers(element);
-    const bool isKey = isSet(qualifiers, "Key");
-    return {requiredAttribute(element, "NAME"),
-            shape.type,
-            shape.isArray,
-            isKey,
-            std::move(shape.referenceClass),
-            std::move(qualifiers),
-            element.attribute("CLASSORIGIN").value(),
-            isTrue(element.attribute("PROPAGATED"))};
+    auto property = readTyped<core::PropertyDeclaration>(element);
+    property.isKey = isSet(property.qualifiers, "Key");
+    readOrigin(element, property);
+    return property;
 }
 
 core::ParameterDeclaration readParameter(const pugi::xml_node& element) {
-    Shape shape = shapeOf(element);
-    std::vector<Qualifier> qualifiers = readQualifiers(element);
+    auto parameter = readTyped<core::ParameterDeclaration>(element);
     // One that goes both ways counts as an output here: it need not be given.
-    const bool isOutput = isSet(qualifiers, "Out");
-    return {requiredAttribute(element, "NAME"),
-            shape.type,
-            shape.isArray,
-            isOutput ? core::CimDirection::Out : core::CimDirection::In,
-            isOutput,
-            std::move(shape.referenceClass),
-            std::move(qualifiers)};
+    parameter.optional = isSet(parameter.qualifiers, "Out");
+    parameter.direction = parameter.optional ? core::CimDirection::Out : core::CimDirection::In;
+    return parameter;
 }
 
 core::MethodDeclaration readMethod(const pugi::xml_node& element) {
-    core::MethodDeclaration method{requiredAttribute(element, "NAME"), typeOf(element), {}};
-    method.origin = element.attribute("CLASSORIGIN").value();
-    method.isPropagated = isTrue(element.attribute("PROPAGATED"));
+    core::MethodDeclaration method{requiredAttribute(element, "NAME"), requireType(element), {}};
+    readOrigin(element, method);
     method.qualifiers = readQualifiers(element);
     for (const pugi::xml_node& child : childElements(element)) {
         if (startsWith(child, "PARAMETER")) method.parameters.push_back(readParameter(child));
@@ -131,9 +117,10 @@ void writeQualifiers(XmlWriter& writer, const std::vector<Qualifier>& qualifiers
     }
 }
 
-void writeOrigin(XmlWriter& writer, const std::string& origin, bool isPropagated) {
-    if (!origin.empty()) writer.attribute("CLASSORIGIN", origin);
-    if (isPropagated) writer.attribute("PROPAGATED", "true");
+template <class Declaration>
+void writeOrigin(XmlWriter& writer, const Declaration& declaration) {
+    if (!declaration.origin.empty()) writer.attribute("CLASSORIGIN", declaration.origin);
+    if (declaration.isPropagated) writer.attribute("PROPAGATED", "true");
 }
 
 /// The element, open for further attributes, with NAME and TYPE or REFERENCECLASS as properties and
@@ -149,36 +136,33 @@ void startTyped(XmlWriter& writer, std::string_view element, const Declaration& 
 }
 
 void writeProperty(XmlWriter& writer, const core::PropertyDeclaration& property) {
-    const std::string_view element = property.isArray                      ? "PROPERTY.ARRAY"
-                                     : property.type == CimType::Reference ? "PROPERTY.REFERENCE"
-                                                                           : "PROPERTY";
+    const std::string_view element = propertyElement(property.type, property.isArray);
     startTyped(writer, element, property);
-    writeOrigin(writer, property.origin, property.isPropagated);
+    writeOrigin(writer, property);
     writer.content();
     writeQualifiers(writer, property.qualifiers);
     writer.end(element);
 }
 
-std::string_view elementOf(const core::ParameterDeclaration& parameter) {
-    if (parameter.type == CimType::Reference) {
-        return parameter.isArray ? "PARAMETER.REFARRAY" : "PARAMETER.REFERENCE";
-    }
-    return parameter.isArray ? "PARAMETER.ARRAY" : "PARAMETER";
+void writeParameter(XmlWriter& writer, const core::ParameterDeclaration& parameter) {
+    const bool isReference = parameter.type == CimType::Reference;
+    const std::string_view element = isReference
+                                         ? (parameter.isArray ? "PARAMETER.REFARRAY" : "PARAMETER.REFERENCE")
+                                         : (parameter.isArray ? "PARAMETER.ARRAY" : "PARAMETER");
+    startTyped(writer, element, parameter);
+    writer.content();
+    writeQualifiers(writer, parameter.qualifiers);
+    writer.end(element);
 }
 
 void writeMethod(XmlWriter& writer, const core::MethodDeclaration& method) {
     writer.start("METHOD").attribute("NAME", method.name);
     writer.attribute("TYPE", core::typeName(method.returnType));
-    writeOrigin(writer, method.origin, method.isPropagated);
+    writeOrigin(writer, method);
     writer.content();
     writeQualifiers(writer, method.qualifiers);
-    for (const core::ParameterDeclaration& parameter : method.parameters) {
-        const std::string_view element = elementOf(parameter);
-        startTyped(writer, element, parameter);
-        writer.content();
-        writeQualifiers(writer, parameter.qualifiers);
-        writer.end(element);
-    }
+    for (const core::ParameterDeclaration& parameter : method.parameters)
+        writeParameter(writer, parameter);
     writer.end("METHOD");
 }
 

@@ -2,11 +2,20 @@
 #include "CimXml/Message.h"
 
 #include "CimXml/WireError.h"
-#include "CimXml/XmlGuard.h"
 
 namespace cimxml {
 
 namespace {
+
+void parseDocument(pugi::xml_document& document, std::string_view bytes) {
+    checkWellFormed(bytes);
+    // Blanks count inside VALUE, so none are dropped here; readers pass over those between elements.
+    constexpr unsigned int kOptions = pugi::parse_cdata | pugi::parse_escapes | pugi::parse_eol |
+                                      pugi::parse_wconv_attribute | pugi::parse_ws_pcdata;
+    const pugi::xml_parse_result result =
+        document.load_buffer(bytes.data(), bytes.size(), kOptions, pugi::encoding_utf8);
+    if (!result) throw WireError(WireFault::kNotWellFormed, result.description());
+}
 
 /// Only the major version tells of another language; a client may use any minor one.
 void checkVersion(const pugi::xml_node& element, const char* attribute, std::string_view major,
@@ -19,7 +28,7 @@ void checkVersion(const pugi::xml_node& element, const char* attribute, std::str
 }
 
 /// The call or response, after the correlators that may stand in front of it (DSP0201 5.2.3.2).
-pugi::xml_node lastElement(const pugi::xml_node& wrapper) {
+pugi::xml_node contentOf(const pugi::xml_node& wrapper) {
     pugi::xml_node content;
     for (const pugi::xml_node& child : childElements(wrapper)) {
         if (isElement(child, "CORRELATOR") && !content) continue;
@@ -36,20 +45,20 @@ Envelope openEnvelope(pugi::xml_document& document, std::string_view bytes, std:
     parseDocument(document, bytes);
     const pugi::xml_node root = document.document_element();
     expectElement(root, "CIM");
-    checkVersion(root, "CIMVERSION", "2.", WireFault::UnsupportedCimVersion);
-    checkVersion(root, "DTDVERSION", "2.", WireFault::UnsupportedDtdVersion);
+    checkVersion(root, "CIMVERSION", "2.", WireFault::kUnsupportedCimVersion);
+    checkVersion(root, "DTDVERSION", "2.", WireFault::kUnsupportedDtdVersion);
     const pugi::xml_node message = onlyChild(root);
     expectElement(message, "MESSAGE");
     Envelope envelope;
     envelope.messageId = requiredAttribute(message, "ID");
-    checkVersion(message, "PROTOCOLVERSION", "1.", WireFault::UnsupportedProtocol);
+    checkVersion(message, "PROTOCOLVERSION", "1.", WireFault::kUnsupportedProtocol);
     const pugi::xml_node wrapped = onlyChild(message);
     // Refused by its own name, so that a client that can batch falls back to single requests.
     if (isElement(wrapped, "MULTIREQ")) {
-        throw WireError(WireFault::MultipleRequests, "several requests in one message");
+        throw WireError(WireFault::kMultipleRequests, "several requests in one message");
     }
     expectElement(wrapped, wrapper);
-    envelope.content = lastElement(wrapped);
+    envelope.content = contentOf(wrapped);
     return envelope;
 }
 
@@ -107,7 +116,7 @@ void expectElement(const pugi::xml_node& element, std::string_view name) {
 }
 
 void refuseElement(const pugi::xml_node& element, std::string_view why) {
-    throw WireError(WireFault::NotValid, "element " + std::string(element.name()) + " " + std::string(why));
+    throw WireError(WireFault::kNotValid, "element " + std::string(element.name()) + " " + std::string(why));
 }
 
 }  // namespace cimxml

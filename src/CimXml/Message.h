@@ -6,7 +6,7 @@
 #include <string_view>
 #include <vector>
 
-#include "CimXml/XmlText.h"
+#include "CimXml/Xml.h"
 
 namespace cimxml {
 

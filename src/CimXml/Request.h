@@ -7,26 +7,9 @@
 #include <variant>
 #include <vector>
 
-#include "Framework/Model/CimValue.h"
+#include "Framework/Requests/RequestValues.h"
 
 namespace cimxml {
-
-/// A value as it stands in a message, before the declaration says of what type it is: null, one text, one
-/// reference, or an array of texts or references.
-struct RawValue {
-    std::optional<core::CimType> type;  ///< as the message says, if it does
-    std::variant<std::monostate, std::string, core::CimPath, std::vector<std::string>,
-                 std::vector<core::CimPath>>
-        data;
-    bool hasNullElement = false;  ///< an array with VALUE.NULL in it; the nulls are not in data
-
-    bool isNull() const { return data.index() == 0; }
-};
-
-struct RawArgument {
-    std::string name;
-    RawValue value;
-};
 
 /// A class, named where an operation takes a class or an instance.
 struct ClassName {
@@ -60,8 +43,10 @@ struct IntrinsicCall {
 struct MethodCall {
     std::string method;  ///< as the client wrote it
     core::CimPath object;
-    bool isClass = false;  ///< named as a class, not as an instance without keys
-    std::vector<RawArgument> arguments;
+    std::vector<core::Argument> arguments;
+    /// The first argument whose value is not of the type that it states; empty when there is none. Such a
+    /// call can be read but not carried out, and its argument is null.
+    std::string mistypedArgument = {};
 };
 
 struct Request {
@@ -79,9 +64,6 @@ Request readRequest(std::string_view bytes);
 
 /// The request message of a call. Thread-safe, no state.
 std::string writeRequest(const Request& request);
-
-/// A typed value in the form in which it is written.
-RawValue rawValueOf(const core::CimValue& value);
 
 /// The CIM headers of an HTTP request (DSP0200 6.2); those that it does not have are empty.
 struct RequestHeaders {

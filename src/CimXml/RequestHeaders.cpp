@@ -1,9 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
-// The HTTP headers of a request, and whether they say what its body says.
+// The HTTP headers of a request, and whether they say what its body says. A firewall or proxy may decide by
+// the headers alone (DSP0200 6.2), so they must not claim another call than the one that is carried out.
 #include <algorithm>
-#include <array>
 #include <charconv>
 
+#include "CimXml/ElementCodec.h"
 #include "CimXml/Request.h"
 #include "CimXml/WireError.h"
 
@@ -31,6 +32,7 @@ std::string percentDecoded(std::string_view text) {
 }
 
 bool isSameNamespace(std::string_view header, const std::string& body) {
+    // The host that may stand in front is not compared: a proxy or a second name may change it.
     if (header.starts_with("//")) header.remove_prefix(std::min(header.find('/', 2), header.size()));
     core::CimPath path;
     path.setNamespace(header);  // without the slashes at its ends
@@ -44,29 +46,25 @@ std::string withoutEscapes(std::string text) {
 
 /// The body's keys are texts, the header's are typed by how they are written.
 bool isSameKey(const core::CimScalar& header, const core::CimScalar& body) {
-    using core::CimType;
-    constexpr std::array kTypes{CimType::Boolean, CimType::Uint64,   CimType::Sint64,   CimType::Real64,
-                                CimType::String,  CimType::Datetime, CimType::Reference};
     const auto* text = std::get_if<std::string>(&body);
     if (text == nullptr) return true;  // a reference: the class and the other keys have to do
     // There are clients that escape nothing in the header.
     if (const auto* quoted = std::get_if<std::string>(&header))
         return withoutEscapes(*quoted) == withoutEscapes(*text);
-    const auto typed = core::parseScalar(kTypes[header.index()], *text);
+    const auto typed = core::parseScalar(typeOfScalar(header), *text);
     return typed && core::sameValue(header, *typed);
 }
 
 bool isSameObject(const core::CimPath& header, const core::CimPath& body) {
-    const auto& keys = header.getKeys();
+    const auto isInBody = [&](const core::CimKey& key) {
+        return std::any_of(body.getKeys().begin(), body.getKeys().end(), [&](const core::CimKey& other) {
+            return core::sameName(key.name, other.name) && isSameKey(key.value, other.value);
+        });
+    };
     return isSameNamespace(header.getNamespace(), body.getNamespace()) &&
            core::sameName(header.getClassName(), body.getClassName()) &&
-           keys.size() == body.getKeys().size() &&
-           std::all_of(keys.begin(), keys.end(), [&](const core::CimKey& key) {
-               return std::any_of(
-                   body.getKeys().begin(), body.getKeys().end(), [&](const core::CimKey& other) {
-                       return core::sameName(key.name, other.name) && isSameKey(key.value, other.value);
-                   });
-           });
+           header.getKeys().size() == body.getKeys().size() &&
+           std::all_of(header.getKeys().begin(), header.getKeys().end(), isInBody);
 }
 
 /// Whether CIMObject names what the body calls: a namespace for an intrinsic operation, else an object.
@@ -87,30 +85,25 @@ struct ObjectMatcher {
 
 }  // namespace
 
-const std::string& Request::name() const {
-    const auto* method = std::get_if<MethodCall>(&call);
-    return method != nullptr ? method->method : std::get<IntrinsicCall>(call).operation;
-}
-
 void checkHeaders(const RequestHeaders& headers) {
-    if (headers.batch) throw WireError(WireFault::MultipleRequests, "several requests in one message");
+    if (headers.batch) throw WireError(WireFault::kMultipleRequests, "several requests in one message");
     if (headers.operation && !core::sameName(*headers.operation, "MethodCall")) {
-        throw WireError(WireFault::UnsupportedOperation, "CIMOperation is not MethodCall");
+        throw WireError(WireFault::kUnsupportedOperation, "CIMOperation is not MethodCall");
     }
     // Without the header it is 1.0 (DSP0200 6.2).
     if (headers.protocolVersion && !headers.protocolVersion->starts_with("1.")) {
-        throw WireError(WireFault::UnsupportedProtocol, "CIMProtocolVersion is not 1.x");
+        throw WireError(WireFault::kUnsupportedProtocol, "CIMProtocolVersion is not 1.x");
     }
 }
 
 void checkHeadersAgainst(const RequestHeaders& headers, const Request& request) {
     if (headers.method && !core::sameName(percentDecoded(*headers.method), request.name())) {
-        throw WireError(WireFault::HeaderMismatch, "CIMMethod is not the method that the message calls");
+        throw WireError(WireFault::kHeaderMismatch, "CIMMethod is not the method that the message calls");
     }
     if (!headers.object) return;
     const std::string object = percentDecoded(*headers.object);
     if (!std::visit(ObjectMatcher{object}, request.call)) {
-        throw WireError(WireFault::HeaderMismatch, "CIMObject is not the object that the message names");
+        throw WireError(WireFault::kHeaderMismatch, "CIMObject is not the object that the message names");
     }
 }
 

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include <array>
 #include <map>
 #include <memory>
 #include <optional>
@@ -24,20 +25,37 @@ struct ErrorResult {
 /// Where each property was first declared, by folded class name and folded property name.
 using Origins = std::map<std::string, std::map<std::string, std::string>>;
 
-/// What IRETURNVALUE holds (DSP0200 5.4.2).
+/// What IRETURNVALUE holds (DSP0200 5.4.2): any number of one element, see resultElement().
 enum class ResultKind {
-    Nothing,            ///< a void operation
-    Instance,           ///< INSTANCE
-    NamedInstances,     ///< VALUE.NAMEDINSTANCE*
-    InstanceNames,      ///< INSTANCENAME*
-    ObjectsWithPath,    ///< VALUE.OBJECTWITHPATH*
-    ObjectPaths,        ///< OBJECTPATH*
-    InstancesWithPath,  ///< VALUE.INSTANCEWITHPATH*
-    InstancePaths,      ///< INSTANCEPATH*
-    Classes,            ///< CLASS*
-    ClassNames,         ///< CLASSNAME*
-    Qualifiers          ///< QUALIFIER.DECLARATION*
+    Nothing,  ///< a void operation
+    Instance,
+    NamedInstances,
+    InstanceNames,
+    ObjectsWithPath,
+    ObjectPaths,
+    InstancesWithPath,
+    InstancePaths,
+    Classes,
+    ClassNames,
+    Qualifiers
 };
+
+/// The elements, in the order of the kinds.
+inline constexpr std::array<std::string_view, 11> kResultElements{"",
+                                                                  "INSTANCE",
+                                                                  "VALUE.NAMEDINSTANCE",
+                                                                  "INSTANCENAME",
+                                                                  "VALUE.OBJECTWITHPATH",
+                                                                  "OBJECTPATH",
+                                                                  "VALUE.INSTANCEWITHPATH",
+                                                                  "INSTANCEPATH",
+                                                                  "CLASS",
+                                                                  "CLASSNAME",
+                                                                  "QUALIFIER.DECLARATION"};
+
+inline std::string_view resultElement(ResultKind kind) {
+    return kResultElements[static_cast<std::size_t>(kind)];
+}
 
 /// The result of an intrinsic operation: the list that goes with the kind, the others empty.
 struct IntrinsicResult {

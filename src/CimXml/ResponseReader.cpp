@@ -1,10 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
+#include <algorithm>
 #include <charconv>
 
-#include "CimXml/ClassCodec.h"
+#include "CimXml/ElementCodec.h"
 #include "CimXml/Message.h"
 #include "CimXml/Response.h"
-#include "CimXml/ValueReader.h"
 
 namespace cimxml {
 
@@ -13,9 +13,9 @@ namespace {
 // A client knows no declarations, so it has nothing but the attributes to go by.
 constexpr KeyTyping kTyping = KeyTyping::ByAttributes;
 
-core::CimValue readTyped(const pugi::xml_node& element, const char* typeAttribute,
-                         std::optional<core::CimType> type, bool isArray) {
-    const auto value = typedValueOf(readValue(element, typeAttribute, kTyping), type, isArray);
+core::CimValue requireValue(const pugi::xml_node& element, std::optional<core::CimType> type,
+                            std::optional<bool> isArray) {
+    const auto value = readValue(element, type, isArray, kTyping);
     if (!value) refuseElement(element, "holds no value of its type");
     return *value;
 }
@@ -24,13 +24,13 @@ core::PropertyValue readProperty(const pugi::xml_node& element) {
     core::PropertyValue property;
     property.name = requiredAttribute(element, "NAME");
     if (isElement(element, "PROPERTY.REFERENCE")) {
-        property.value = readTyped(element, "TYPE", core::CimType::Reference, false);
+        property.value = requireValue(element, core::CimType::Reference, false);
         property.referenceClass = element.attribute("REFERENCECLASS").value();
         return property;
     }
     const bool isArray = isElement(element, "PROPERTY.ARRAY");
     if (!isArray) expectElement(element, "PROPERTY");
-    property.value = readTyped(element, "TYPE", std::nullopt, isArray);
+    property.value = requireValue(element, readType(element, "TYPE"), isArray);
     return property;
 }
 
@@ -54,7 +54,7 @@ void markKeys(core::InstanceValue& instance) {
 }
 
 /// VALUE.NAMEDINSTANCE, VALUE.OBJECTWITHPATH, VALUE.INSTANCEWITHPATH.
-core::InstanceValue readPlacedInstance(const pugi::xml_node& element) {
+core::InstanceValue readInstanceWithPath(const pugi::xml_node& element) {
     const std::vector<pugi::xml_node> parts = childElements(element);
     if (parts.size() != 2) refuseElement(element, "must hold a path and an instance");
     core::InstanceValue instance = readInstance(parts[1]);
@@ -63,27 +63,10 @@ core::InstanceValue readPlacedInstance(const pugi::xml_node& element) {
     return instance;
 }
 
-struct KindOfElement {
-    std::string_view element;
-    ResultKind kind;
-};
-
-constexpr KindOfElement kKinds[] = {{"INSTANCE", ResultKind::Instance},
-                                    {"VALUE.NAMEDINSTANCE", ResultKind::NamedInstances},
-                                    {"VALUE.OBJECTWITHPATH", ResultKind::ObjectsWithPath},
-                                    {"VALUE.INSTANCEWITHPATH", ResultKind::InstancesWithPath},
-                                    {"INSTANCENAME", ResultKind::InstanceNames},
-                                    {"OBJECTPATH", ResultKind::ObjectPaths},
-                                    {"INSTANCEPATH", ResultKind::InstancePaths},
-                                    {"CLASS", ResultKind::Classes},
-                                    {"CLASSNAME", ResultKind::ClassNames},
-                                    {"QUALIFIER.DECLARATION", ResultKind::Qualifiers}};
-
 ResultKind kindOf(const pugi::xml_node& element) {
-    for (const KindOfElement& known : kKinds) {
-        if (isElement(element, known.element)) return known.kind;
-    }
-    refuseElement(element, "is no result that is known");
+    const auto* found = std::find(kResultElements.begin(), kResultElements.end(), element.name());
+    if (found == kResultElements.end()) refuseElement(element, "is no result that is known");
+    return static_cast<ResultKind>(found - kResultElements.begin());
 }
 
 void readReturned(IntrinsicResult& result, const pugi::xml_node& element) {
@@ -95,7 +78,7 @@ void readReturned(IntrinsicResult& result, const pugi::xml_node& element) {
         case ResultKind::NamedInstances:
         case ResultKind::ObjectsWithPath:
         case ResultKind::InstancesWithPath:
-            result.instances.push_back(readPlacedInstance(element));
+            result.instances.push_back(readInstanceWithPath(element));
             break;
         case ResultKind::InstanceNames:
         case ResultKind::InstancePaths:
@@ -117,12 +100,8 @@ void readReturned(IntrinsicResult& result, const pugi::xml_node& element) {
 
 core::Argument readOutput(const pugi::xml_node& element) {
     expectElement(element, "PARAMVALUE");
-    const RawValue raw = readValue(element, "PARAMTYPE", kTyping);
-    // PARAMVALUE is the same element for arrays and single values; only what is inside tells.
-    const bool isArray = raw.data.index() > 2;
-    const auto value = typedValueOf(raw, std::nullopt, isArray);
-    if (!value) refuseElement(element, "holds no value of its type");
-    return {requiredAttribute(element, "NAME"), *value};
+    return {requiredAttribute(element, "NAME"),
+            requireValue(element, readType(element, "PARAMTYPE"), std::nullopt)};
 }
 
 std::uint32_t readNumber(const pugi::xml_node& element, const std::string& text) {

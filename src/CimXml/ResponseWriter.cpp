@@ -1,8 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "CimXml/ClassCodec.h"
+#include "CimXml/ElementCodec.h"
 #include "CimXml/Message.h"
 #include "CimXml/Response.h"
-#include "CimXml/ValueWriter.h"
 
 namespace cimxml {
 
@@ -17,15 +16,10 @@ const ClassOrigins* originsOf(const Origins* origins, const std::string& classNa
     return found == origins->end() ? nullptr : &found->second;
 }
 
-std::string_view elementOf(const core::CimValue& value) {
-    if (value.isArray) return "PROPERTY.ARRAY";
-    return value.type == core::CimType::Reference ? "PROPERTY.REFERENCE" : "PROPERTY";
-}
-
 void writeProperty(XmlWriter& writer, const core::PropertyValue& property, const ClassOrigins* origins) {
-    const std::string_view element = elementOf(property.value);
+    const std::string_view element = propertyElement(property.value.type, property.value.isArray);
     writer.start(element).attribute("NAME", property.name);
-    // PROPERTY.REFERENCE has no attribute TYPE, and there are readers that fail on an unknown attribute.
+    // PROPERTY.REFERENCE has no attribute TYPE (DSP0201 5.2.4.3), and there are readers that fail on one.
     if (element == "PROPERTY.REFERENCE") {
         if (!property.referenceClass.empty()) writer.attribute("REFERENCECLASS", property.referenceClass);
     } else {
@@ -50,74 +44,45 @@ void writeInstance(XmlWriter& writer, const core::InstanceValue& instance, const
     writer.end("INSTANCE");
 }
 
-/// Writes IRETURNVALUE of one result.
-class ReturnValueWriter {
-  public:
-    ReturnValueWriter(XmlWriter& writer, const IntrinsicResult& result, const std::string& host)
-        : m_writer(writer), m_result(result), m_host(host) {}
+/// Writes the objects of one result, each in the element of its kind.
+struct ResultWriter {
+    XmlWriter& writer;
+    const IntrinsicResult& result;
+    const std::string& host;
 
-    void write() const {
-        // A void operation has no IRETURNVALUE and an empty list has an empty one: clients tell them apart.
-        if (m_result.kind == ResultKind::Nothing) return;
-        m_writer.open("IRETURNVALUE");
-        for (const core::InstanceValue& instance : m_result.instances)
-            writeOne(instance);
-        for (const core::CimPath& path : m_result.paths)
-            writeOne(path);
-        for (const core::ClassDeclaration& declaration : m_result.classes)
-            writeClass(m_writer, declaration);
-        for (const std::string& name : m_result.classNames) {
-            m_writer.start("CLASSNAME").attribute("NAME", name).empty();
-        }
-        for (const core::QualifierDeclaration& declaration : m_result.qualifiers) {
-            writeQualifierDeclaration(m_writer, declaration);
-        }
-        m_writer.end("IRETURNVALUE");
-    }
-
-  private:
-    void writeOne(const core::InstanceValue& instance) const {
-        const std::string_view wrapper = wrapperOfInstance();
-        if (!wrapper.empty()) {
-            m_writer.open(wrapper);
-            // Only an enumeration answers for one namespace and host, which the client knows already.
-            if (m_result.kind == ResultKind::NamedInstances) {
-                writeInstanceName(m_writer, instance.path);
-            } else {
-                writeInstancePath(m_writer, instance.path, m_host);
-            }
-        }
-        writeInstance(m_writer, instance, m_result.origins.get());
-        if (!wrapper.empty()) m_writer.end(wrapper);
-    }
-
-    void writeOne(const core::CimPath& path) const {
-        if (m_result.kind == ResultKind::InstanceNames) {
-            writeInstanceName(m_writer, path);
+    void write(const core::InstanceValue& instance) const {
+        if (result.kind == ResultKind::Instance) {
+            writeInstance(writer, instance, result.origins.get());
             return;
         }
-        const bool wrapped = m_result.kind == ResultKind::ObjectPaths;
-        if (wrapped) m_writer.open("OBJECTPATH");
-        writeInstancePath(m_writer, path, m_host);
-        if (wrapped) m_writer.end("OBJECTPATH");
-    }
-
-    std::string_view wrapperOfInstance() const {
-        switch (m_result.kind) {
-            case ResultKind::NamedInstances:
-                return "VALUE.NAMEDINSTANCE";
-            case ResultKind::ObjectsWithPath:
-                return "VALUE.OBJECTWITHPATH";
-            case ResultKind::InstancesWithPath:
-                return "VALUE.INSTANCEWITHPATH";
-            default:
-                return "";
+        const std::string_view element = resultElement(result.kind);
+        writer.open(element);
+        // Only an enumeration answers for one namespace and host, which the client knows already.
+        if (result.kind == ResultKind::NamedInstances) {
+            writeInstanceName(writer, instance.path);
+        } else {
+            writeInstancePath(writer, instance.path, host);
         }
+        writeInstance(writer, instance, result.origins.get());
+        writer.end(element);
     }
 
-    XmlWriter& m_writer;
-    const IntrinsicResult& m_result;
-    const std::string& m_host;
+    void write(const core::CimPath& path) const {
+        const bool isObjectPath = result.kind == ResultKind::ObjectPaths;
+        if (isObjectPath) writer.open("OBJECTPATH");
+        if (result.kind == ResultKind::InstanceNames) {
+            writeInstanceName(writer, path);
+        } else {
+            writeInstancePath(writer, path, host);
+        }
+        if (isObjectPath) writer.end("OBJECTPATH");
+    }
+
+    void write(const core::ClassDeclaration& declaration) const { writeClass(writer, declaration); }
+    void write(const std::string& className) const { writeClassName(writer, className); }
+    void write(const core::QualifierDeclaration& declaration) const {
+        writeQualifierDeclaration(writer, declaration);
+    }
 };
 
 /// Writes what is inside IMETHODRESPONSE or METHODRESPONSE.
@@ -130,7 +95,16 @@ struct ContentWriter {
         writer.attribute("DESCRIPTION", error.description).empty();
     }
     void operator()(const IntrinsicResult& result) const {
-        ReturnValueWriter(writer, result, response.host).write();
+        // A void operation has no IRETURNVALUE and an empty list has an empty one: clients tell them apart.
+        if (result.kind != ResultKind::Nothing) {
+            writer.open("IRETURNVALUE");
+            writeAll(result, result.instances);
+            writeAll(result, result.paths);
+            writeAll(result, result.classes);
+            writeAll(result, result.classNames);
+            writeAll(result, result.qualifiers);
+            writer.end("IRETURNVALUE");
+        }
         writeOutputs(result.outputs);
     }
     void operator()(const core::MethodResult& result) const {
@@ -141,10 +115,16 @@ struct ContentWriter {
     }
 
   private:
+    template <class Objects>
+    void writeAll(const IntrinsicResult& result, const Objects& objects) const {
+        for (const auto& object : objects)
+            ResultWriter{writer, result, response.host}.write(object);
+    }
+
     void writeOutputs(const std::vector<core::Argument>& outputs) const {
         for (const core::Argument& output : outputs) {
             // There are clients that crash on a PARAMVALUE without a value.
-            if (!output.value.isNull()) writeParamValue(writer, output);
+            if (!output.value.isNull()) writeArgument(writer, output);
         }
     }
 };

@@ -1,40 +1,36 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "CimXml/ValueReader.h"
-
 #include <algorithm>
 #include <array>
 #include <utility>
 
+#include "CimXml/ElementCodec.h"
 #include "CimXml/Message.h"
 
 namespace cimxml {
 
 namespace {
 
-/// TYPE is precise where it is there; VALUETYPE tells numbers from texts but not their width. A text that is
-/// no value of its stated type stays a text, since a foreign server's path still has to be sent back as it
-/// came.
-core::CimScalar typedText(const pugi::xml_node& element, std::string text) {
-    if (const auto type = core::typeByName(element.attribute("TYPE").value())) {
-        return core::parseScalar(*type, text).value_or(core::CimScalar(text));
-    }
+/// TYPE is precise where it is there; VALUETYPE tells numbers from texts but not their width.
+std::optional<core::CimScalar> typedKey(const pugi::xml_node& element, const std::string& text) {
+    if (const auto type = core::typeByName(element.attribute("TYPE").value()))
+        return core::parseScalar(*type, text);
     const std::string_view valueType = element.attribute("VALUETYPE").value();
-    std::optional<core::CimScalar> value;
-    if (core::sameName(valueType, "boolean")) {
-        value = core::parseScalar(core::CimType::Boolean, text);
-    } else if (core::sameName(valueType, "numeric")) {
-        value = core::parseScalar(core::CimType::Uint64, text);
-        if (!value) value = core::parseScalar(core::CimType::Sint64, text);
-        if (!value) value = core::parseScalar(core::CimType::Real64, text);
-    }
-    return value.value_or(core::CimScalar(std::move(text)));
+    if (core::sameName(valueType, "boolean")) return core::parseScalar(core::CimType::Boolean, text);
+    if (!core::sameName(valueType, "numeric")) return std::nullopt;
+    auto number = core::parseScalar(core::CimType::Uint64, text);
+    if (!number) number = core::parseScalar(core::CimType::Sint64, text);
+    return number ? number : core::parseScalar(core::CimType::Real64, text);
 }
 
 core::CimScalar readKeyValue(const pugi::xml_node& element, KeyTyping typing) {
     if (isElement(element, "VALUE.REFERENCE")) return readReference(element, typing);
     expectElement(element, "KEYVALUE");
     std::string text = textOf(element);
-    return typing == KeyTyping::Text ? core::CimScalar(std::move(text)) : typedText(element, std::move(text));
+    if (typing == KeyTyping::ByAttributes) {
+        if (auto typed = typedKey(element, text)) return std::move(*typed);
+    }
+    // Also one that is not of its stated type: a foreign server's path has to be sent back as it came.
+    return text;
 }
 
 core::CimPath readInstanceName(const pugi::xml_node& element, KeyTyping typing) {
@@ -44,7 +40,7 @@ core::CimPath readInstanceName(const pugi::xml_node& element, KeyTyping typing) 
         if (isElement(child, "KEYBINDING")) {
             keys.push_back({requiredAttribute(child, "NAME"), readKeyValue(onlyChild(child), typing)});
         } else if (children.size() == 1) {
-            // DSP0201 lets the key of a class with a single one go without its name.
+            // The key of a class with a single one may go without its name (DSP0201 5.2.2.2).
             keys.push_back({"", readKeyValue(child, typing)});
         } else {
             refuseElement(child, "stands where KEYBINDING was expected");
@@ -53,90 +49,38 @@ core::CimPath readInstanceName(const pugi::xml_node& element, KeyTyping typing) 
     return {requiredAttribute(element, "CLASSNAME"), std::move(keys)};
 }
 
-struct Place {
-    std::string host;
-    std::string namespaceName;
-};
-
-Place readPlace(const pugi::xml_node& element) {
-    if (isElement(element, "LOCALNAMESPACEPATH")) return {"", readNamespace(element)};
+/// Sets the host, if the element has one, and the namespace: NAMESPACEPATH or LOCALNAMESPACEPATH.
+void readLocation(const pugi::xml_node& element, core::CimPath& path) {
+    if (isElement(element, "LOCALNAMESPACEPATH")) {
+        path.setNamespace(readNamespace(element));
+        return;
+    }
     expectElement(element, "NAMESPACEPATH");
     const std::vector<pugi::xml_node> parts = childElements(element);
     if (parts.size() != 2) refuseElement(element, "must hold HOST and LOCALNAMESPACEPATH");
     expectElement(parts[0], "HOST");
-    return {textOf(parts[0]), readNamespace(parts[1])};
+    path.setHost(textOf(parts[0]));
+    path.setNamespace(readNamespace(parts[1]));
 }
 
-/// The elements that put a place in front of a name.
-constexpr std::array<std::string_view, 4> kPlaced{"LOCALINSTANCEPATH", "INSTANCEPATH", "LOCALCLASSPATH",
-                                                  "CLASSPATH"};
-
-bool isPlaced(const pugi::xml_node& element) {
-    return std::find(kPlaced.begin(), kPlaced.end(), std::string_view(element.name())) != kPlaced.end();
+/// Whether the element puts a namespace in front of a name.
+bool isFullPath(const pugi::xml_node& element) {
+    constexpr std::array<std::string_view, 4> kFullPaths{"LOCALINSTANCEPATH", "INSTANCEPATH",
+                                                         "LOCALCLASSPATH", "CLASSPATH"};
+    return std::find(kFullPaths.begin(), kFullPaths.end(), std::string_view(element.name())) !=
+           kFullPaths.end();
 }
 
-bool isNullElement(const pugi::xml_node& element) {
-    return isElement(element, "VALUE.NULL");
-}
-
-std::vector<core::CimPath> readReferences(const pugi::xml_node& element, KeyTyping typing, bool& hasNull) {
-    std::vector<core::CimPath> paths;
-    for (const pugi::xml_node& child : childElements(element)) {
-        if (isNullElement(child)) {
-            hasNull = true;
-        } else {
-            paths.push_back(readReference(child, typing));
-        }
-    }
-    return paths;
-}
-
-std::optional<core::CimScalar> parseOne(core::CimType type, const std::string& text) {
+/// One VALUE of the type; nothing when its text is no such value.
+std::optional<core::CimScalar> readText(const pugi::xml_node& element, core::CimType type) {
+    expectElement(element, "VALUE");
+    std::string text = textOf(element);
+    // Most values are strings, and a large answer has many thousands.
+    if (type == core::CimType::String) return core::CimScalar(std::move(text));
     // A path written as a text would be guessed at: a reference has an element of its own.
     if (type == core::CimType::Reference) return std::nullopt;
     return core::parseScalar(type, text);
 }
-
-std::optional<core::CimScalar> parseOne(core::CimType type, const core::CimPath& path) {
-    if (type != core::CimType::Reference) return std::nullopt;
-    return core::CimScalar(path);
-}
-
-template <class T>
-std::optional<std::vector<core::CimScalar>> parseAll(core::CimType type, const std::vector<T>& items) {
-    std::vector<core::CimScalar> values;
-    values.reserve(items.size());
-    for (const T& item : items) {
-        auto value = parseOne(type, item);
-        if (!value) return std::nullopt;
-        values.push_back(std::move(*value));
-    }
-    return values;
-}
-
-/// Turns whichever form the raw value has into the declared one.
-struct Typer {
-    core::CimType type;
-    bool isArray;
-
-    std::optional<core::CimValue> operator()(std::monostate) const {
-        return core::CimValue::null(type, isArray);
-    }
-    template <class T>
-    std::optional<core::CimValue> operator()(const T& single) const {
-        auto value = parseOne(type, single);
-        if (!value) return std::nullopt;
-        // An array of one element may come as the element alone.
-        if (isArray) return core::CimValue::arrayOf(type, {std::move(*value)});
-        return core::CimValue::of(type, std::move(*value));
-    }
-    template <class T>
-    std::optional<core::CimValue> operator()(const std::vector<T>& items) const {
-        auto values = parseAll(type, items);
-        if (!isArray || !values) return std::nullopt;
-        return core::CimValue::arrayOf(type, std::move(*values));
-    }
-};
 
 }  // namespace
 
@@ -152,21 +96,15 @@ std::string readNamespace(const pugi::xml_node& element) {
     return joined;
 }
 
-bool isObject(const pugi::xml_node& element) {
-    return isElement(element, "INSTANCENAME") || isElement(element, "CLASSNAME") || isPlaced(element);
-}
-
 ObjectName readObject(const pugi::xml_node& element, KeyTyping typing) {
     if (isElement(element, "CLASSNAME")) return {{requiredAttribute(element, "NAME"), {}}, true};
     if (isElement(element, "INSTANCENAME")) return {readInstanceName(element, typing), false};
-    if (!isPlaced(element)) refuseElement(element, "names no object");
+    if (!isFullPath(element)) refuseElement(element, "names no object");
     const std::vector<pugi::xml_node> parts = childElements(element);
-    // A placed name inside a placed name would let a message nest without end.
-    if (parts.size() != 2 || isPlaced(parts[1])) refuseElement(element, "must hold a namespace and a name");
-    Place place = readPlace(parts[0]);
+    // A full path inside a full path would let a message nest without end.
+    if (parts.size() != 2 || isFullPath(parts[1])) refuseElement(element, "must hold a namespace and a name");
     ObjectName object = readObject(parts[1], typing);
-    object.path.setHost(std::move(place.host));
-    object.path.setNamespace(place.namespaceName);
+    readLocation(parts[0], object.path);
     return object;
 }
 
@@ -175,48 +113,42 @@ core::CimPath readReference(const pugi::xml_node& element, KeyTyping typing) {
     return readObject(onlyChild(element), typing).path;
 }
 
-std::vector<std::string> readTexts(const pugi::xml_node& element, bool& hasNull) {
-    expectElement(element, "VALUE.ARRAY");
-    std::vector<std::string> texts;
-    for (const pugi::xml_node& child : childElements(element)) {
-        if (isNullElement(child)) {
-            hasNull = true;
-        } else {
-            expectElement(child, "VALUE");
-            texts.push_back(textOf(child));
-        }
-    }
-    return texts;
+std::optional<core::CimType> readType(const pugi::xml_node& element, const char* attribute) {
+    const pugi::xml_attribute name = element.attribute(attribute);
+    if (!name) return std::nullopt;
+    const auto type = core::typeByName(name.value());
+    if (!type) refuseElement(element, "has an unknown type");
+    return type;
 }
 
-RawValue readValue(const pugi::xml_node& element, const char* typeAttribute, KeyTyping typing) {
-    RawValue raw;
-    if (const pugi::xml_attribute attribute = element.attribute(typeAttribute)) {
-        raw.type = core::typeByName(attribute.value());
-        if (!raw.type) refuseElement(element, "has an unknown type");
-    }
-    const std::vector<pugi::xml_node> children = childElements(element);
-    if (children.empty()) return raw;
+std::optional<core::CimValue> readValue(const pugi::xml_node& element, std::optional<core::CimType> type,
+                                        std::optional<bool> isArray, KeyTyping typing) {
+    using core::CimType;
+    if (childElements(element).empty())
+        return core::CimValue::null(type.value_or(CimType::String), isArray.value_or(false));
     const pugi::xml_node value = onlyChild(element);
-    if (isElement(value, "VALUE")) {
-        raw.data = textOf(value);
-    } else if (isElement(value, "VALUE.ARRAY")) {
-        raw.data = readTexts(value, raw.hasNullElement);
-    } else if (isElement(value, "VALUE.REFERENCE")) {
-        raw.data = readReference(value, typing);
-    } else if (isElement(value, "VALUE.REFARRAY")) {
-        raw.data = readReferences(value, typing, raw.hasNullElement);
-    } else {
-        raw.data = readObject(value, typing).path;
+    const bool holdsTexts = isElement(value, "VALUE") || isElement(value, "VALUE.ARRAY");
+    const bool holdsArray = isElement(value, "VALUE.ARRAY") || isElement(value, "VALUE.REFARRAY");
+    const CimType known = type.value_or(holdsTexts ? CimType::String : CimType::Reference);
+    // Read to the end even after a value that does not fit: a message that is not valid is refused as such.
+    bool fits = isArray.value_or(holdsArray) || !holdsArray;
+    std::vector<core::CimScalar> scalars;
+    for (const pugi::xml_node& each : holdsArray ? childElements(value) : std::vector{value}) {
+        std::optional<core::CimScalar> scalar;
+        if (holdsTexts && !isElement(each, "VALUE.NULL")) {
+            scalar = readText(each, known);
+        } else if (!isElement(each, "VALUE.NULL")) {
+            const bool isNamed = holdsArray || isElement(each, "VALUE.REFERENCE");
+            core::CimPath path = isNamed ? readReference(each, typing) : readObject(each, typing).path;
+            if (known == CimType::Reference) scalar = std::move(path);
+        }
+        fits = fits && scalar;
+        if (fits) scalars.push_back(std::move(*scalar));
     }
-    return raw;
-}
-
-std::optional<core::CimValue> typedValueOf(const RawValue& raw, std::optional<core::CimType> type,
-                                           bool isArray) {
-    if (raw.hasNullElement) return std::nullopt;
-    const core::CimType known = type.value_or(raw.type.value_or(core::CimType::String));
-    return std::visit(Typer{known, isArray}, raw.data);
+    if (!fits) return std::nullopt;
+    // An array of one element may come as the element alone.
+    if (isArray.value_or(holdsArray)) return core::CimValue::arrayOf(known, std::move(scalars));
+    return core::CimValue::of(known, std::move(scalars.front()));
 }
 
 }  // namespace cimxml

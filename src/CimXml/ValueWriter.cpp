@@ -1,33 +1,16 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "CimXml/ValueWriter.h"
-
 #include <algorithm>
+#include <array>
+
+#include "CimXml/ElementCodec.h"
 
 namespace cimxml {
 
 namespace {
 
-struct KeyType {
-    std::string_view valueType;
-    std::string_view type;  ///< empty where the width of a number is not known
-    core::CimType cimType;
-};
+using core::CimType;
 
-/// The attributes of a key. Old clients know VALUETYPE alone, and TYPE tells apart what it throws together; a
-/// wrong width in TYPE would be worse than none.
-struct KeyTypes {
-    KeyType operator()(bool) const { return {"boolean", "boolean", core::CimType::Boolean}; }
-    KeyType operator()(std::uint64_t) const { return {"numeric", "", core::CimType::Uint64}; }
-    KeyType operator()(std::int64_t) const { return {"numeric", "", core::CimType::Sint64}; }
-    KeyType operator()(double) const { return {"numeric", "", core::CimType::Real64}; }
-    KeyType operator()(const std::string&) const { return {"string", "string", core::CimType::String}; }
-    KeyType operator()(const utils::Time&) const { return {"string", "datetime", core::CimType::Datetime}; }
-    KeyType operator()(const core::CimPath&) const {
-        return {"string", "reference", core::CimType::Reference};
-    }
-};
-
-void writeText(XmlWriter& writer, core::CimType type, const core::CimScalar& value) {
+void writeContent(XmlWriter& writer, CimType type, const core::CimScalar& value) {
     // Most values are texts, and copying one only to escape it costs as much again.
     if (const auto* text = std::get_if<std::string>(&value)) {
         writer.text(*text);
@@ -36,30 +19,52 @@ void writeText(XmlWriter& writer, core::CimType type, const core::CimScalar& val
     }
 }
 
-void writeKeyValue(XmlWriter& writer, const core::CimScalar& value) {
-    if (const auto* path = std::get_if<core::CimPath>(&value)) {
-        writeReference(writer, *path);
-        return;
+/// VALUE.REFERENCE.
+void writeReference(XmlWriter& writer, const core::CimPath& path) {
+    writer.open("VALUE.REFERENCE");
+    // Common clients read a local path in any place; a bare name would leave them without a namespace.
+    if (path.getNamespace().empty() && path.isInstancePath()) {
+        writeInstanceName(writer, path);
+    } else {
+        writeLocalPath(writer, path);
     }
-    const KeyType type = std::visit(KeyTypes(), value);
-    writer.start("KEYVALUE").attribute("VALUETYPE", type.valueType);
-    if (!type.type.empty()) writer.attribute("TYPE", type.type);
+    writer.end("VALUE.REFERENCE");
+}
+
+/// KEYVALUE. Old clients know VALUETYPE alone, and TYPE tells apart what it throws together. A number is held
+/// without its width, and a wrong TYPE would be worse than none.
+void writeKeyValue(XmlWriter& writer, const core::CimScalar& value) {
+    const CimType type = typeOfScalar(value);
+    const bool isNumber = core::isUnsigned(type) || core::isSigned(type) || core::isReal(type);
+    writer.start("KEYVALUE");
+    writer.attribute("VALUETYPE", type == CimType::Boolean ? "boolean" : isNumber ? "numeric" : "string");
+    if (!isNumber) writer.attribute("TYPE", core::typeName(type));
     writer.content();
-    writeText(writer, type.cimType, value);
+    writeContent(writer, type, value);
     writer.end("KEYVALUE");
 }
 
-void writeScalar(XmlWriter& writer, core::CimType type, const core::CimScalar& value) {
+void writeScalar(XmlWriter& writer, CimType type, const core::CimScalar& value) {
     if (const auto* path = std::get_if<core::CimPath>(&value)) {
         writeReference(writer, *path);
-        return;
+    } else if (type == CimType::Reference) {
+        // Held as the text that somebody typed.
+        writeReference(writer, core::CimPath(core::scalarText(type, value)));
+    } else {
+        writer.open("VALUE");
+        writeContent(writer, type, value);
+        writer.end("VALUE");
     }
-    writer.open("VALUE");
-    writeText(writer, type, value);
-    writer.end("VALUE");
 }
 
 }  // namespace
+
+CimType typeOfScalar(const core::CimScalar& value) {
+    constexpr std::array kTypes{CimType::Boolean, CimType::Uint64,   CimType::Sint64,   CimType::Real64,
+                                CimType::String,  CimType::Datetime, CimType::Reference};
+    static_assert(kTypes.size() == std::variant_size_v<core::CimScalar>);
+    return kTypes[value.index()];
+}
 
 void writeNamespace(XmlWriter& writer, std::string_view namespaceName) {
     writer.open("LOCALNAMESPACEPATH");
@@ -71,11 +76,19 @@ void writeNamespace(XmlWriter& writer, std::string_view namespaceName) {
     writer.end("LOCALNAMESPACEPATH");
 }
 
+void writeClassName(XmlWriter& writer, std::string_view name) {
+    writer.start("CLASSNAME").attribute("NAME", name).empty();
+}
+
 void writeInstanceName(XmlWriter& writer, const core::CimPath& path) {
     writer.start("INSTANCENAME").attribute("CLASSNAME", path.getClassName()).content();
     for (const core::CimKey& key : path.getKeys()) {
         writer.start("KEYBINDING").attribute("NAME", key.name).content();
-        writeKeyValue(writer, key.value);
+        if (const auto* reference = std::get_if<core::CimPath>(&key.value)) {
+            writeReference(writer, *reference);
+        } else {
+            writeKeyValue(writer, key.value);
+        }
         writer.end("KEYBINDING");
     }
     writer.end("INSTANCENAME");
@@ -88,7 +101,7 @@ void writeLocalPath(XmlWriter& writer, const core::CimPath& path) {
     if (path.isInstancePath()) {
         writeInstanceName(writer, path);
     } else {
-        writer.start("CLASSNAME").attribute("NAME", path.getClassName()).empty();
+        writeClassName(writer, path.getClassName());
     }
     writer.end(element);
 }
@@ -103,23 +116,11 @@ void writeInstancePath(XmlWriter& writer, const core::CimPath& path, std::string
     writer.end("INSTANCEPATH");
 }
 
-void writeReference(XmlWriter& writer, const core::CimPath& path) {
-    writer.open("VALUE.REFERENCE");
-    // Both common clients read a local path in any place; a bare name would leave them without a namespace.
-    if (path.getNamespace().empty() && path.isInstancePath()) {
-        writeInstanceName(writer, path);
-    } else {
-        writeLocalPath(writer, path);
-    }
-    writer.end("VALUE.REFERENCE");
-}
-
 void writeValue(XmlWriter& writer, const core::CimValue& value) {
     if (const core::CimScalar* scalar = value.scalar()) {
         writeScalar(writer, value.type, *scalar);
     } else if (const std::vector<core::CimScalar>* elements = value.elements()) {
-        const std::string_view array =
-            value.type == core::CimType::Reference ? "VALUE.REFARRAY" : "VALUE.ARRAY";
+        const std::string_view array = value.type == CimType::Reference ? "VALUE.REFARRAY" : "VALUE.ARRAY";
         writer.open(array);
         for (const core::CimScalar& element : *elements)
             writeScalar(writer, value.type, element);
@@ -127,18 +128,21 @@ void writeValue(XmlWriter& writer, const core::CimValue& value) {
     }
 }
 
-void writeParamValue(XmlWriter& writer, const core::Argument& argument) {
+void writeText(XmlWriter& writer, std::string_view text) {
+    writer.open("VALUE").text(text).end("VALUE");
+}
+
+void writeArgument(XmlWriter& writer, const core::Argument& argument) {
     writer.start("PARAMVALUE").attribute("NAME", argument.name);
-    writer.attribute("PARAMTYPE", core::typeName(argument.value.type)).content();
+    if (!argument.isUntyped) writer.attribute("PARAMTYPE", core::typeName(argument.value.type));
+    writer.content();
     writeValue(writer, argument.value);
     writer.end("PARAMVALUE");
 }
 
-void writeTexts(XmlWriter& writer, const std::vector<std::string>& texts) {
-    writer.open("VALUE.ARRAY");
-    for (const std::string& text : texts)
-        writer.open("VALUE").text(text).end("VALUE");
-    writer.end("VALUE.ARRAY");
+std::string_view propertyElement(CimType type, bool isArray) {
+    if (isArray) return "PROPERTY.ARRAY";
+    return type == CimType::Reference ? "PROPERTY.REFERENCE" : "PROPERTY";
 }
 
 }  // namespace cimxml

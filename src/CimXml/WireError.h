@@ -6,31 +6,37 @@
 
 namespace cimxml {
 
-/// Why a message is refused before any operation is called. The names are those of the CIMError header
-/// (DSP0200 6.3), each with the HTTP status that goes with it.
-enum class WireFault {
-    NotWellFormed,          ///< 400 request-not-well-formed
-    NotValid,               ///< 400 request-not-valid
-    HeaderMismatch,         ///< 400 header-mismatch
-    UnsupportedOperation,   ///< 400 unsupported-operation
-    UnsupportedProtocol,    ///< 501 unsupported-protocol-version
-    UnsupportedCimVersion,  ///< 501 unsupported-cim-version
-    UnsupportedDtdVersion,  ///< 501 unsupported-dtd-version
-    MultipleRequests        ///< 501 multiple-requests-unsupported
+/// Why a message is refused before any operation is called: a name for the CIMError header (DSP0200 6.3), and
+/// the HTTP status that goes with it.
+struct WireFault {
+    int httpStatus;
+    const char* cimError;
+
+    static const WireFault kNotWellFormed;
+    static const WireFault kNotValid;
+    static const WireFault kHeaderMismatch;
+    static const WireFault kUnsupportedOperation;
+    static const WireFault kUnsupportedProtocol;
+    static const WireFault kUnsupportedCimVersion;
+    static const WireFault kUnsupportedDtdVersion;
+    static const WireFault kMultipleRequests;
 };
 
-/// The HTTP status of the fault: 400 or 501.
-int httpStatus(WireFault fault);
+inline constexpr WireFault WireFault::kNotWellFormed{400, "request-not-well-formed"};
+inline constexpr WireFault WireFault::kNotValid{400, "request-not-valid"};
+inline constexpr WireFault WireFault::kHeaderMismatch{400, "header-mismatch"};
+inline constexpr WireFault WireFault::kUnsupportedOperation{400, "unsupported-operation"};
+inline constexpr WireFault WireFault::kUnsupportedProtocol{501, "unsupported-protocol-version"};
+inline constexpr WireFault WireFault::kUnsupportedCimVersion{501, "unsupported-cim-version"};
+inline constexpr WireFault WireFault::kUnsupportedDtdVersion{501, "unsupported-dtd-version"};
+inline constexpr WireFault WireFault::kMultipleRequests{501, "multiple-requests-unsupported"};
 
-/// The fault's name in the CIMError header.
-const char* cimErrorHeader(WireFault fault);
-
-/// A message that cannot be taken. what() says for a person what is wrong with it.
+/// A message that cannot be taken. what() tells a person what is wrong with it.
 class WireError : public std::runtime_error {
   public:
-    WireError(WireFault fault, const std::string& text) : std::runtime_error(text), m_fault(fault) {}
+    WireError(const WireFault& fault, const std::string& text) : std::runtime_error(text), m_fault(fault) {}
 
-    WireFault fault() const { return m_fault; }
+    const WireFault& fault() const { return m_fault; }
 
   private:
     WireFault m_fault;

@@ -1,13 +1,13 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "CimXml/XmlGuard.h"
-
 #include <algorithm>
 #include <array>
+#include <charconv>
+#include <cstdint>
 #include <string>
 #include <vector>
 
 #include "CimXml/WireError.h"
-#include "CimXml/XmlText.h"
+#include "CimXml/Xml.h"
 #include "Utils/Utils.h"
 
 namespace cimxml {
@@ -60,7 +60,7 @@ class Scanner {
 
   private:
     [[noreturn]] static void refuse(const std::string& text) {
-        throw WireError(WireFault::NotWellFormed, text);
+        throw WireError(WireFault::kNotWellFormed, text);
     }
 
     /// Takes what is before the position, or everything when it is npos.
@@ -207,26 +207,12 @@ class Scanner {
         constexpr std::array<std::string_view, 5> kEntities{"amp", "lt", "gt", "quot", "apos"};
         if (std::find(kEntities.begin(), kEntities.end(), name) != kEntities.end()) return true;
         if (!name.starts_with('#')) return false;
-        name.remove_prefix(1);
-        const bool hexadecimal = name.starts_with('x');
-        if (hexadecimal) name.remove_prefix(1);
-        if (name.empty()) return false;
-        char32_t character = 0;
-        for (const char digit : name) {
-            const int value = digitValue(digit, hexadecimal);
-            // Left as soon as it is too large, before it can wrap around.
-            if (value < 0 || character > 0x10FFFF) return false;
-            character = character * (hexadecimal ? 16 : 10) + static_cast<char32_t>(value);
-        }
-        return isXmlCharacter(character);
-    }
-
-    static int digitValue(char digit, bool hexadecimal) {
-        if (digit >= '0' && digit <= '9') return digit - '0';
-        if (!hexadecimal) return -1;
-        if (digit >= 'a' && digit <= 'f') return digit - 'a' + 10;
-        if (digit >= 'A' && digit <= 'F') return digit - 'A' + 10;
-        return -1;
+        const bool isHexadecimal = name.starts_with("#x");
+        name.remove_prefix(isHexadecimal ? 2 : 1);
+        std::uint32_t character = 0;
+        const char* end = name.data() + name.size();
+        const auto result = std::from_chars(name.data(), end, character, isHexadecimal ? 16 : 10);
+        return result.ec == std::errc() && result.ptr == end && isXmlCharacter(character);
     }
 
     std::string_view m_rest;
@@ -243,20 +229,9 @@ class Scanner {
 void checkWellFormed(std::string_view document, const XmlLimits& limits) {
     if (document.starts_with("\xEF\xBB\xBF")) document.remove_prefix(3);
     if (!isXmlText(document)) {
-        throw WireError(WireFault::NotWellFormed, "a byte that is no character of XML in UTF-8");
+        throw WireError(WireFault::kNotWellFormed, "a byte that is no character of XML in UTF-8");
     }
     Scanner(document, limits).scan();
-}
-
-void parseDocument(pugi::xml_document& document, std::string_view bytes) {
-    checkWellFormed(bytes);
-    // Blanks count inside VALUE, so none are dropped here; readers pass over those between
-    // elements.
-    constexpr unsigned int kOptions = pugi::parse_cdata | pugi::parse_escapes | pugi::parse_eol |
-                                      pugi::parse_wconv_attribute | pugi::parse_ws_pcdata;
-    const pugi::xml_parse_result result =
-        document.load_buffer(bytes.data(), bytes.size(), kOptions, pugi::encoding_utf8);
-    if (!result) throw WireError(WireFault::NotWellFormed, result.description());
 }
 
 }  // namespace cimxml

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "CimXml/XmlText.h"
-
 #include <array>
+
+#include "CimXml/Xml.h"
 
 namespace cimxml {
 

@@ -7,14 +7,12 @@
 #include <string>
 #include <vector>
 
-#include "Host/Operations/PullContexts.h"
-
 namespace host {
 
 /// Everything that bounds what clients can make the daemon spend. All have options.
 struct ServerLimits {
     std::size_t bodyBytes = 1U << 20;            ///< of one request
-    std::size_t anonymousBodyBytes = 16U << 10;  ///< read, to be polite, of one that is refused
+    std::size_t anonymousBodyBytes = 16U << 10;  ///< read of one that is refused, so that the answer arrives
     std::size_t headerBytes = 32U << 10;         ///< of one request, buffers of the connection included
     unsigned int connections = 256;              ///< and so connection threads
     unsigned int connectionsPerAddress = 64;
@@ -22,6 +20,13 @@ struct ServerLimits {
     std::chrono::seconds headerTime{10};   ///< from the connection, or the end of idling, to the last header
     std::chrono::seconds requestTime{30};  ///< for a body to arrive, and for an answer to be taken
     std::chrono::seconds idleTime{60};     ///< between requests
+};
+
+/// Pull enumerations: those that clients open and read in pieces.
+struct PullLimits {
+    std::size_t open = 32;                 ///< enumerations open at a time
+    std::chrono::seconds timeout{180};     ///< between two pulls, unless the client asks for less or more
+    std::chrono::seconds maxTimeout{600};  ///< what it may ask for
 };
 
 struct ListenSettings {

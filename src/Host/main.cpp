@@ -8,16 +8,10 @@
 #include <iostream>
 
 #include "Host/Daemon/CommandLine.h"
-#include "Host/Daemon/ConfigCheck.h"
 #include "Host/Daemon/Daemon.h"
-#include "Host/Daemon/LockFile.h"
-#include "Host/Daemon/PasswdCommand.h"
 #include "Host/Daemon/Report.h"
-#include "Host/Daemon/ServiceManager.h"
 
 namespace {
-
-constexpr unsigned int kMoreSeconds = 30;
 
 /// The signals that the main thread waits for, and no thread is interrupted by.
 class Signals {
@@ -48,25 +42,28 @@ class Signals {
 };
 
 void serve(host::Daemon& daemon, const Signals& signals) {
-    const std::string serving = "Serving " + daemon.places();
-    host::ServiceManager::ready(serving);
+    const std::string serving = "Serving " + daemon.addresses();
+    host::notifyServiceManager("READY=1\nSTATUS=" + serving);
     host::report(serving);
     while (signals.wait() == SIGHUP) {
-        host::ServiceManager::reloading();
+        host::notifyServiceManager("RELOADING=1");
         daemon.reload();
-        host::ServiceManager::ready(serving);
+        host::notifyServiceManager("READY=1\nSTATUS=" + serving);
     }
 }
 
 void stop(host::Daemon& daemon, const Signals& signals) {
     host::report("Stopping.");
-    host::ServiceManager::stopping("Stopping.");
+    host::notifyServiceManager("STOPPING=1\nSTATUS=Stopping.");
     daemon.stopAccepting();
     std::string said;
     for (std::string rest = daemon.unfinished(); !rest.empty(); rest = daemon.unfinished()) {
-        if (rest != said) host::report("Waiting for " + rest + ".");
+        const std::string waiting = "Waiting for " + rest + ".";
+        if (rest != said) host::report(waiting);
         said = rest;
-        host::ServiceManager::stillStopping("Waiting for " + rest + ".", kMoreSeconds);
+        // Thirty seconds more each time, since a flash takes longer than the service manager waits for a
+        // stop.
+        host::notifyServiceManager("EXTEND_TIMEOUT_USEC=30000000\nSTATUS=" + waiting);
         // An adapter that is written to half is worse than a slow stop.
         if (signals.waitBriefly() != 0) host::report("Asked again to stop. Still waiting for " + rest + ".");
     }
@@ -76,7 +73,6 @@ int run(const host::Settings& settings) {
     // Before any thread starts, so that all of them inherit the mask.
     const Signals signals;
     try {
-        const host::LockFile lock(settings.lockFile);
         host::Daemon daemon(settings);
         serve(daemon, signals);
         stop(daemon, signals);

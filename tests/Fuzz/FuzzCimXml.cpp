@@ -4,7 +4,7 @@
 #include "CimXml/Request.h"
 #include "CimXml/Response.h"
 #include "CimXml/WireError.h"
-#include "CimXml/XmlGuard.h"
+#include "CimXml/Xml.h"
 #include "Fuzz/Require.h"
 
 namespace {

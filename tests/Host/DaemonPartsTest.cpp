@@ -5,10 +5,10 @@
 
 #include <sstream>
 
+#include "Host/Authentication/PasswordChecker.h"
 #include "Host/Daemon/CommandLine.h"
-#include "Host/Daemon/ConfigCheck.h"
 #include "Host/Daemon/SettingsField.h"
-#include "Host/Server/TlsIdentity.h"
+#include "Host/Server/ServerCertificate.h"
 #include "Support/TempFolder.h"
 
 namespace {
@@ -16,7 +16,7 @@ namespace {
 using host::Settings;
 using Words = std::vector<std::string>;
 
-TEST(SettingsTest, MistakesInTheFileAreNamed) {
+TEST(SettingsTest, NameTheMistakesInTheFile) {
     const test::TempFolder folder;
     Settings settings;
     const std::pair<const char*, const char*> table[] = {
@@ -31,7 +31,10 @@ TEST(SettingsTest, MistakesInTheFileAreNamed) {
         {"[listen]\nunknown = 1\n", ":2: there is no setting listen.unknown"},
         {"[unknown]\nx = 1\n", "unknown.x"},
         {"https = true\n", "must be in a [section]"},
-        {"[listen\n", ":1: "}};
+        {"[listen\n", ":1: "},
+        {"[auth]\nmethod = users # two\n", ":2: "},
+        {"[auth]\nmethod = users # two\n", ". A text must stand in quotes: method = \"users\""},
+        {"[listen]\naddress = 127.0.0.1", ". A text must stand in quotes: address = \"127.0.0.1\""}};
     for (const auto& [content, expected] : table) {
         const std::string file = folder.write("bad", content);
         try {
@@ -92,18 +95,53 @@ TEST(CommandLineTest, PutsOptionsBeforeTheFile) {
     EXPECT_EQ(line.settings.authentication.rememberFor, std::chrono::seconds(5));
     const auto other = read({"--config", file, "--auth-readers", "b", "c"});
     EXPECT_EQ(other.settings.authentication.readers, (Words{"b", "c"}));
-    const std::vector<Words> mistakes{{"--unknown"},
-                                      {"--config", "/nonexistent"},
-                                      {"--limits-workers", "0"},
-                                      {"--listen-https", "false"},
-                                      {"--listen-http", "maybe"},
-                                      {"--auth-method", "ldap"},
-                                      {"--limits-body-bytes", "2000"},
-                                      {"--limits-enumeration-seconds", "601"},
-                                      {"--adapters-state", "/tmp"},
-                                      {"passwd"}};
-    for (const Words& mistake : mistakes)
-        EXPECT_EQ(read(mistake).exitStatus, 2) << mistake[0];
+}
+
+TEST(CommandLineTest, SaysWhatWouldBeRight) {
+    const std::pair<Words, const char*> table[] = {
+        {{"--listen-port", "5"}, "no option --listen-port. There are --listen-address, --listen-https, --l"},
+        {{"--unknown=5"}, "no option --unknown. \"quenx-cimd --help\" lists all options."},
+        {{"password"}, "\"password\" is not expected here. The only command is passwd."},
+        {{"--config"}, "--config: 1 required TEXT missing. \"quenx-cimd --help\""},
+        {{"--config", "/nonexistent"}, "/nonexistent: there is no such file"},
+        {{"--limits-workers", "0"}, "limits.workers is \"0\". It must be a number from 1 to 4096."},
+        {{"--listen-https", "false"}, "Set one of them to true."},
+        {{"--listen-http", "maybe"}, "It must be true or false."},
+        {{"--auth-method", "ldap"}, "It must be \"pam\" or \"users\"."},
+        {{"--limits-body-bytes", "2000"}, "is larger than limits.body_bytes."},
+        {{"--limits-enumeration-seconds", "601"}, "is larger than limits.enumeration_most_seconds."},
+        {{"--adapters-state", "/tmp"}, "Set both, or neither."},
+        {{"passwd"}, "passwd needs the name of a user"},
+        {{"passwd", "--delete", "--reader", "admin"}, "Give only one of them."},
+        {{"--check-config", "passwd", "admin"}, "Give only one of them."},
+    };
+    for (const auto& [arguments, expected] : table) {
+        ::testing::internal::CaptureStderr();
+        EXPECT_EQ(read(arguments).exitStatus, 2) << expected;
+        const std::string said = ::testing::internal::GetCapturedStderr();
+        EXPECT_TRUE(said.starts_with("quenx-cimd: ") && said.find(expected) != std::string::npos) << said;
+    }
+}
+
+TEST(PasswdTest, SaysWhatKeepsTheFileFromBeingUsed) {
+    const test::TempFolder folder;
+    const std::string file = folder / "users";
+    host::writeUsersFile(file, {{"a", {"$x", true}}, {"b", {"$x", true}}, {"c", {"$x", true}}});
+    const std::string start = "in [auth], or start quenx-cimd with ";
+    const std::pair<Words, std::string> table[] = {
+        {{"passwd", "--delete", "a", "--auth-method", "users", "--auth-users-file", file}, ""},
+        {{"passwd", "--delete", "b", "--auth-method", "users", "--users", file},
+         "Set users_file = \"" + file + "\" " + start + "--auth-users-file " + file + ".\n"},
+        {{"passwd", "--delete", "c", "--users", file},
+         "Set method = \"users\" and users_file = \"" + file + "\" " + start +
+             "--auth-method users --auth-users-file " + file + ".\n"}};
+    for (const auto& [arguments, expected] : table) {
+        ::testing::internal::CaptureStdout();
+        EXPECT_EQ(host::runPasswd(*read(arguments).passwd), 0);
+        const std::string said = ::testing::internal::GetCapturedStdout();
+        EXPECT_EQ(said.find("is not used yet") != std::string::npos, !expected.empty()) << said;
+        EXPECT_NE(said.find(expected), std::string::npos) << said;
+    }
 }
 
 TEST(ConfigCheckTest, LooksAtEveryFile) {
@@ -132,6 +170,7 @@ TEST(ConfigCheckTest, LooksAtEveryFile) {
         {0, folder / "none", folder / "none", {"--tls-generate"}},
         {2, folder / "none", folder / "none", {}},
         {2, certificate, key, {"--listen-address", "localhost"}},
+        {2, certificate, key, {"--listen-address", "192.0.2.1"}},
         {2, certificate, key, {"--daemon-lock-file", "/nonexistent/lock"}},
         {2, certificate, key, {"--auth-method", "users", "--auth-users-file", "/nonexistent"}},
         {2, certificate, key, {"--providers-configuration", "/nonexistent"}},
@@ -146,7 +185,7 @@ TEST(ConfigCheckTest, LooksAtEveryFile) {
         {2, key, key, {}},
     };
     for (const auto& row : table) {
-        Words arguments{"--config", folder.write("config", "")};
+        Words arguments{"--config", folder.write("config", ""), "--listen-https-port", "0"};
         arguments.insert(arguments.end(), {"--tls-certificate", row.certificate, "--tls-key", row.key});
         arguments.insert(arguments.end(), row.more.begin(), row.more.end());
         EXPECT_EQ(host::checkConfiguration(read(arguments).settings), row.status) << &row - table;

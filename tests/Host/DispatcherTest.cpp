@@ -27,6 +27,17 @@ CimPath link() {
     return {"Test_Link", {{"From", gadget("a", "1")}, {"To", gadget("b", "2")}}};
 }
 
+/// An argument of one value, in an array or alone, as a client that states this type, or none, sends it.
+core::Argument argument(const std::string& name, core::CimScalar value,
+                        std::optional<core::CimType> stated = {}) {
+    return {name, core::CimValue::of(stated.value_or(core::CimType::String), std::move(value)), !stated};
+}
+core::Argument arrayOf(const std::string& name, std::vector<core::CimScalar> values,
+                       std::optional<core::CimType> stated = {}) {
+    return {name, core::CimValue::arrayOf(stated.value_or(core::CimType::String), std::move(values)),
+            !stated};
+}
+
 class DispatcherTest : public ::testing::Test {
   protected:
     DispatcherTest()
@@ -36,7 +47,9 @@ class DispatcherTest : public ::testing::Test {
     }
 
     cimxml::Response answer(std::variant<cimxml::IntrinsicCall, cimxml::MethodCall> call) {
-        const cimxml::Response response = m_dispatcher.dispatch({"1", std::move(call)}, m_caller);
+        // Over the wire, so that the texts of a message are typed as they are in the daemon.
+        const cimxml::Request request = cimxml::readRequest(cimxml::writeRequest({"1", std::move(call)}));
+        const cimxml::Response response = m_dispatcher.dispatch(request, m_caller);
         EXPECT_EQ(test::faultsOf(cimxml::writeResponse(response)), "");
         return response;
     }
@@ -64,9 +77,9 @@ class DispatcherTest : public ::testing::Test {
     }
 
     cimxml::Response invoke(CimPath object, const std::string& method,
-                            std::vector<cimxml::RawArgument> arguments, bool isClass = false) {
+                            std::vector<core::Argument> arguments) {
         object.setNamespace(m_namespace);
-        return answer(cimxml::MethodCall{method, object, isClass, std::move(arguments)});
+        return answer(cimxml::MethodCall{method, object, std::move(arguments)});
     }
 
     template <class Result>
@@ -169,27 +182,62 @@ TEST_F(DispatcherTest, AnswersEachMistakeByItsStatus) {
     EXPECT_EQ(status("Nonsense", {}), 3);
 }
 
-TEST_F(DispatcherTest, ShowsClasses) {
-    const auto local = call("GetClass", {{"ClassName", ClassName{"test_gadget"}}}).classes.at(0);
-    EXPECT_EQ(local.superclass, "Test_Thing");
-    EXPECT_EQ(local.properties.size(), 3U);
-    const auto all = call("GetClass", {{"ClassName", ClassName{"Test_Gadget"}},
-                                       {"LocalOnly", "false"},
-                                       {"IncludeClassOrigin", "true"}})
-                         .classes.at(0);
-    ASSERT_EQ(all.properties.size(), 5U);
-    for (const core::PropertyDeclaration& property : all.properties) {
-        EXPECT_EQ(property.isPropagated, property.name == "Caption" || property.name == "Codes");
-        const bool isNew = property.name == "Number" || property.name == "Made";
-        EXPECT_EQ(property.origin, isNew ? "Test_Gadget" : "Test_Thing") << property.name;
-    }
+/// The last text of an array, in brackets; empty for what is none.
+std::string lastIn(const core::CimValue& value) {
+    const auto* elements = value.elements();
+    return elements == nullptr ? "" : "[" + std::get<std::string>(elements->back()) + "]";
+}
 
-    const auto bare = call("GetClass", {{"ClassName", ClassName{"Test_Link"}},
-                                        {"IncludeQualifiers", "false"},
-                                        {"PropertyList", std::vector<std::string>{"to"}}})
-                          .classes.at(0);
-    EXPECT_TRUE(bare.qualifiers.empty());
-    EXPECT_EQ(bare.properties.size(), 1U);
+/// An element of a class: a star marks what comes from a superclass, "@" the class that first declared it.
+template <class Element>
+std::string textOf(const Element& element) {
+    std::string text = element.name;
+    if constexpr (requires { element.origin; }) {
+        if (element.isPropagated) text += "*";
+        if (!element.origin.empty()) text += "@" + element.origin;
+    }
+    for (const core::Qualifier& each : element.qualifiers)
+        text += " " + each.name + (each.isPropagated ? "*" : "") + lastIn(each.value);
+    return text + "\n";
+}
+
+/// The class as a client reads it off the wire.
+std::string classText(const cimxml::Response& response) {
+    const cimxml::Response read = cimxml::readResponse(cimxml::writeResponse(response));
+    const core::ClassDeclaration shown = std::get<IntrinsicResult>(read.content).classes.at(0);
+    std::string text = textOf(shown);
+    for (const core::PropertyDeclaration& property : shown.properties)
+        text += textOf(property);
+    for (const core::MethodDeclaration& method : shown.methods) {
+        text += textOf(method);
+        for (const core::ParameterDeclaration& parameter : method.parameters)
+            text += " " + textOf(parameter);
+    }
+    return text;
+}
+
+TEST_F(DispatcherTest, ShowsClasses) {
+    const cimxml::Parameter gadget{"ClassName", ClassName{"test_gadget"}};
+    const cimxml::Parameter whole{"LocalOnly", "FALSE"};
+    const std::pair<Given, const char*> table[] = {
+        {{gadget},
+         "Test_Gadget\nID Key Override\nNumber Key\nMade\nWork Description ValueMap[..] Values[The sum]\n"
+         " Job In Out\n Text In\n Numbers In Description ValueMap[7] Values[Seven]\n Echo In Out\n"
+         "NotImplemented\n"},
+        {{gadget, whole},
+         "Test_Gadget Description*\nID Key Override Description*\nCaption*\n"
+         "Codes* Description* ValueMap*[..] Values*[Reserved]\nNumber Key\nMade\n"
+         "Work Description ValueMap[..] Values[The sum]\n Job In Out\n Text In\n"
+         " Numbers In Description ValueMap[7] Values[Seven]\n Echo In Out\nNotImplemented\n"},
+        {{gadget, whole, {"IncludeQualifiers", "FALSE"}, {"IncludeClassOrigin", "TRUE"}},
+         "Test_Gadget\nID@Test_Thing\nCaption*@Test_Thing\nCodes*@Test_Thing\nNumber@Test_Gadget\n"
+         "Made@Test_Gadget\nWork@Test_Gadget\n Job\n Text\n Numbers\n Echo\nNotImplemented@Test_Gadget\n"},
+        {{{"ClassName", ClassName{"Test_Link"}}, {"PropertyList", std::vector<std::string>{"to"}}},
+         "Test_Link Association\nTo Key\n"},
+    };
+    for (const auto& [parameters, expected] : table)
+        EXPECT_EQ(classText(send("GetClass", parameters)), expected);
+
     EXPECT_EQ(call("EnumerateClassNames", {}).classNames,
               (std::vector<std::string>{"Test_Link", "Test_Thing"}));
     EXPECT_EQ(call("EnumerateClassNames", {{"DeepInheritance", "true"}}).classNames.size(), 3U);
@@ -198,101 +246,68 @@ TEST_F(DispatcherTest, ShowsClasses) {
     EXPECT_EQ(call("EnumerateQualifiers", {}).qualifiers.size(), core::qualifierDeclarations().size());
 }
 
-/// The qualifiers of an element in one text; a star marks those that come from a superclass.
-std::string textOf(const std::vector<core::Qualifier>& qualifiers) {
-    std::string text;
-    for (const core::Qualifier& each : qualifiers)
-        text += each.name + (each.isPropagated ? "* " : " ");
-    return text;
-}
-
-TEST_F(DispatcherTest, ShowsTheQualifiersOfEveryElement) {
-    const Given gadget{{"ClassName", ClassName{"Test_Gadget"}}};
-    const auto local = call("GetClass", gadget).classes.at(0);
-    EXPECT_EQ(textOf(local.qualifiers), "");
-    EXPECT_EQ(textOf(local.properties.at(0).qualifiers), "Key Override ");
-    const core::MethodDeclaration& work = local.methods.at(0);
-    EXPECT_EQ(textOf(work.qualifiers), "Description ValueMap Values ");
-    EXPECT_EQ(textOf(work.parameters.at(0).qualifiers), "In Out ");
-    EXPECT_EQ(textOf(work.parameters.at(2).qualifiers), "In Description ValueMap Values ");
-
-    // On the wire they are what they were, and what a superclass says is marked as such.
-    const auto whole = send("GetClass", {gadget[0], {"LocalOnly", "FALSE"}});
-    const auto read = cimxml::readResponse(cimxml::writeResponse(whole));
-    const core::ClassDeclaration all = std::get<cimxml::IntrinsicResult>(read.content).classes.at(0);
-    EXPECT_EQ(textOf(all.qualifiers), "Description* ");
-    EXPECT_EQ(textOf(all.properties.at(0).qualifiers), "Key Override Description* ");
-    EXPECT_EQ(textOf(all.properties.at(2).qualifiers), "Description* ValueMap* Values* ");
-    EXPECT_EQ(textOf(all.methods.at(0).parameters.at(2).qualifiers), "In Description ValueMap Values ");
-    const core::CimValue& values = core::findQualifier(all.properties[2].qualifiers, "valuemap")->value;
-    EXPECT_EQ(std::get<std::string>(values.elements()->at(1)), "1..9");
-
-    const auto link = call("GetClass", {{"ClassName", ClassName{"Test_Link"}}}).classes.at(0);
-    EXPECT_EQ(textOf(link.qualifiers), "Association ");
-    const auto bare = call("GetClass", {gadget[0], {"LocalOnly", "FALSE"}, {"IncludeQualifiers", "FALSE"}});
-    EXPECT_EQ(textOf(bare.classes.at(0).properties.at(0).qualifiers), "");
-    EXPECT_EQ(textOf(bare.classes.at(0).methods.at(0).parameters.at(0).qualifiers), "");
-    EXPECT_TRUE(bare.classes.at(0).properties.at(0).isKey);
-}
-
 TEST_F(DispatcherTest, CallsMethods) {
     const CimPath a = gadget("a", "1");
-    const cimxml::RawArgument text{"text", {{}, std::string("hello"), false}};
-    const auto numbers = [](std::vector<std::string> values) {
-        return cimxml::RawArgument{"Numbers", {{}, std::move(values), false}};
-    };
+    const core::Argument text = argument("text", "hello");
     // What is given for an output reaches the method, but the job is the method's own.
-    const cimxml::RawArgument echo{"ECHO", {{}, std::string("given "), false}};
-    const cimxml::RawArgument job{"Job", {{}, gadget("b", "2"), false}};
-    const cimxml::Response response = invoke(a, "work", {numbers({"5", " 0x10 "}), text, echo, job});
+    const cimxml::Response response = invoke(a, "work",
+                                             {arrayOf("Numbers", {"5", " 0x10 "}), text,
+                                              argument("ECHO", "given "), argument("Job", gadget("b", "2"))});
     const auto& result = std::get<core::MethodResult>(response.content);
     EXPECT_EQ(response.name, "work");
     EXPECT_EQ(result.returnValue, 21U);
     EXPECT_EQ(output(result, "Echo"), "given hello");
     EXPECT_EQ(output(result, "Job"), "root/cimv2:Test_Gadget.ID=\"a\",Number=1");
-    // One element of an array may come alone, and an optional input may be left out.
-    EXPECT_EQ(statusIn(invoke(a, "Work", {text, {"Numbers", {{}, std::string("7"), false}}})), 0);
-    EXPECT_EQ(statusIn(invoke(a, "Work", {text})), 0);
 
-    EXPECT_EQ(statusIn(invoke(gadget("a", "9"), "Work", {text})), 6);
-    EXPECT_EQ(statusIn(invoke(CimPath("Unknown", {}), "Work", {text})), 6);
-    EXPECT_EQ(statusIn(invoke(CimPath("Test_Gadget", {}), "Work", {text}, true)), 16);
-    EXPECT_EQ(statusIn(invoke(CimPath("Test_Gadget", {{"ID", std::string("a")}}), "Work", {text})), 4);
-    EXPECT_EQ(statusIn(invoke(a, "Play", {})), 17);
-    EXPECT_EQ(statusIn(invoke(a, "NotImplemented", {})), 16);
-    EXPECT_EQ(statusIn(invoke(a, "Work", {text, text})), 4);
-    EXPECT_EQ(statusIn(invoke(a, "Work", {text, {"Unknown", {}}})), 4);
+    const struct {
+        int status;
+        CimPath object;
+        const char* method;
+        std::vector<core::Argument> arguments;
+    } table[] = {
+        // One element of an array may come alone, and an optional input may be left out.
+        {0, a, "Work", {text, argument("Numbers", "7")}},
+        {0, a, "Work", {text}},
+        {6, gadget("a", "9"), "Work", {text}},
+        {6, CimPath("Unknown", {}), "Work", {text}},
+        {16, CimPath("Test_Gadget", {}), "Work", {text}},
+        {4, CimPath("Test_Gadget", {{"ID", std::string("a")}}), "Work", {text}},
+        {17, a, "Play", {}},
+        {16, a, "NotImplemented", {}},
+        {4, a, "Work", {text, text}},
+        {4, a, "Work", {text, argument("Unknown", "x")}},
+    };
+    for (const auto& row : table)
+        EXPECT_EQ(statusIn(invoke(row.object, row.method, row.arguments)), row.status) << &row - table;
 }
 
 TEST_F(DispatcherTest, TakesOnlyArgumentsOfTheDeclaredKind) {
+    using core::CimType;
     const CimPath a = gadget("a", "1");
-    const auto statusOf = [&](std::optional<core::CimType> stated, decltype(cimxml::RawValue::data) data) {
-        const cimxml::RawArgument text{"Text", {{}, std::string("x"), false}};
-        return statusIn(invoke(a, "Work", {text, {"Numbers", {stated, std::move(data), false}}}));
+    const auto statusWith = [&](const core::Argument& numbers) {
+        return statusIn(invoke(a, "Work", {argument("Text", "x"), numbers}));
     };
     // Without a stated type the declaration decides; some clients state the width that the value needs.
-    for (const auto type : {std::optional<core::CimType>(), std::optional(core::CimType::Uint16),
-                            std::optional(core::CimType::Uint8), std::optional(core::CimType::Sint64)}) {
-        EXPECT_EQ(statusOf(type, std::vector<std::string>{"5"}), 0);
-        for (const std::string bad : {"", "x", "65536", "-1", "1.5"})
-            EXPECT_EQ(statusOf(type, bad), 4) << bad;
+    for (const auto type : {std::optional<CimType>(), std::optional(CimType::Uint16),
+                            std::optional(CimType::Uint8), std::optional(CimType::Sint64)}) {
+        EXPECT_EQ(statusWith(arrayOf("Numbers", {"5"}, type)), 0);
+        for (const char* bad : {"", "x", "65536", "-1", "1.5"})
+            EXPECT_EQ(statusWith(argument("Numbers", bad, type)), 4) << bad;
     }
-    for (const auto type : {core::CimType::String, core::CimType::Boolean, core::CimType::Real32,
-                            core::CimType::Datetime, core::CimType::Reference})
-        EXPECT_EQ(statusOf(type, std::vector<std::string>{"1"}), 4) << core::typeName(type);
-    EXPECT_EQ(statusOf({}, gadget("b", "2")), 4);
+    for (const auto type : {CimType::String, CimType::Boolean, CimType::Real32, CimType::Datetime})
+        EXPECT_EQ(statusWith(arrayOf("Numbers", {"1"}, type)), 4) << core::typeName(type);
+    EXPECT_EQ(statusWith(argument("Numbers", gadget("b", "2"))), 4);
 
-    const auto workOn = [&](cimxml::RawValue text) { return invoke(a, "Work", {{"Text", std::move(text)}}); };
-    EXPECT_EQ(statusIn(workOn({{}, std::vector<std::string>{"x"}, false})), 4);
-    EXPECT_EQ(statusIn(workOn({core::CimType::Uint16, std::string("5"), false})), 4);
-    // The provider says what is missing, in its own words; its own failures are none of the client's.
-    const cimxml::Response missing = workOn({});
+    const core::Argument bad[] = {arrayOf("Text", {"x"}), argument("Text", "5", CimType::Uint16),
+                                  argument("Numbers", "5")};  // the last leaves Text out
+    for (const core::Argument& each : bad)
+        EXPECT_EQ(statusIn(invoke(a, "Work", {each})), 4);
+    // The provider says what is missing, in its own words; its own failures are not the client's.
+    const cimxml::Response missing = invoke(a, "Work", {{"Text", core::CimValue()}});
     EXPECT_EQ(statusIn(missing), 4);
     EXPECT_EQ(std::get<cimxml::ErrorResult>(missing.content).description,
               "SMASHv2:EUnspecifiedError:Text is missing");
-    EXPECT_EQ(statusIn(invoke(a, "Work", {})), 4);
-    EXPECT_EQ(statusIn(workOn({{}, std::string("fail"), false})), 1);
-    EXPECT_EQ(statusIn(invoke(a, "Work", {{"Numbers", {{}, std::vector<std::string>{"5"}, true}}})), 4);
+    EXPECT_EQ(statusIn(invoke(a, "Work", {argument("Text", "fail")})), 1);
 }
 
 TEST_F(DispatcherTest, PullsToTheEnd) {

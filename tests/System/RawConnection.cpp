@@ -30,21 +30,6 @@ bool isWhole(const std::string& answer) {
     return answer.size() - end - 4 >= std::strtoul(answer.c_str() + length + 16, nullptr, 10);
 }
 
-std::string base64(const std::string& bytes) {
-    constexpr char kLetters[] = "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+/";
-    std::string text;
-    for (std::size_t i = 0; i < bytes.size(); i += 3) {
-        unsigned int bits = 0;
-        for (std::size_t k = 0; k < 3; ++k) {
-            bits = (bits << 8) | (i + k < bytes.size() ? static_cast<unsigned char>(bytes[i + k]) : 0U);
-        }
-        for (std::size_t k = 0; k < 4; ++k) {
-            text += i + k <= bytes.size() ? kLetters[(bits >> (18 - 6 * k)) & 63U] : '=';
-        }
-    }
-    return text;
-}
-
 }  // namespace
 
 RawConnection::RawConnection(int port, const std::string& from)
@@ -86,11 +71,10 @@ bool RawConnection::isClosed() const {
     return length == 0 || errno == ECONNRESET;
 }
 
-std::string httpRequest(const std::string& body, const std::string& user) {
-    std::string text = "POST /cimom HTTP/1.1\r\nHost: 127.0.0.1\r\nContent-Type: application/xml\r\n";
-    text += "CIMOperation: MethodCall\r\n";
-    if (!user.empty()) text += "Authorization: Basic " + base64(user + ":" + user) + "\r\n";
-    return text + "Content-Length: " + std::to_string(body.size()) + "\r\n\r\n" + body;
+std::string httpRequest(const std::string& body, const std::string& authorization) {
+    return "POST /cimom HTTP/1.1\r\nHost: 127.0.0.1\r\nContent-Type: application/xml\r\n"
+           "CIMOperation: MethodCall\r\n" +
+           authorization + "\r\nContent-Length: " + std::to_string(body.size()) + "\r\n\r\n" + body;
 }
 
 int statusOf(const std::string& answer) {

@@ -32,8 +32,9 @@ class RawConnection {
     const int m_socket;
 };
 
-/// "POST /cimom" with the body, as the user, whose name is the password; without credentials for none.
-std::string httpRequest(const std::string& body, const std::string& user = "admin");
+/// "POST /cimom" with the body, by the user "admin" with that password, or with another header in its place.
+std::string httpRequest(const std::string& body,
+                        const std::string& authorization = "Authorization: Basic YWRtaW46YWRtaW4=");
 
 /// The number behind "HTTP/1.1 " of an answer; 0 for none.
 int statusOf(const std::string& answer);

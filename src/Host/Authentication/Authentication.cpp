@@ -56,12 +56,14 @@ AuthenticationResult Authentication::authenticate(const std::optional<std::strin
                                                   const std::string& address) {
     const auto credentials = header ? readBasicHeader(*header) : std::nullopt;
     if (!credentials) return {AuthenticationOutcome::Missing, {}};
-    std::optional<User> user = m_cache.find(*credentials, FailureDelays::keyOf(address));
-    if (!user) {
-        // Whoever guesses passwords shall not keep those out who share the address and know theirs.
-        if (!m_cache.knows(*credentials, FailureDelays::keyOf(address)) && !waitForTurn(address))
-            return {AuthenticationOutcome::Busy, {}};
-        const SlotUse check(m_checks, kWaitForCheck);
+    const auto known = m_cache.find(*credentials, FailureDelays::keyOf(address));
+    // Whoever guesses passwords shall not keep those out who share the address and know theirs.
+    if (!known && !waitForTurn(address)) return {AuthenticationOutcome::Busy, {}};
+    std::optional<User> user;
+    if (known && known->isFresh) {
+        user = known->user;
+    } else {
+        const HeldSlot check(m_checks, kWaitForCheck);
         if (!check) return {AuthenticationOutcome::Busy, {}};
         user = checkNow(*credentials, address);
     }
@@ -80,15 +82,15 @@ bool Authentication::waitForTurn(const std::string& address) {
 }
 
 std::optional<User> Authentication::checkNow(const Credentials& credentials, const std::string& address) {
-    // Several requests may have come with the same credentials while the first of them was checked.
     const std::string place = FailureDelays::keyOf(address);
-    std::optional<User> user = m_cache.find(credentials, place);
-    if (user) return user;
+    // Several requests may have come with the same credentials while the first of them was checked.
+    const auto known = m_cache.find(credentials, place);
+    if (known && known->isFresh) return known->user;
     const std::uint64_t generation = m_cache.generation();
-    user = m_checker->check(credentials, address);
+    const std::optional<User> user = m_checker->check(credentials, address);
     if (user) {
         // One who did not have to wait says nothing about the others there.
-        if (!m_cache.knows(credentials, place)) m_delays.succeeded(address);
+        if (!known) m_delays.succeeded(address);
         m_cache.remember(credentials, place, *user, generation);
     } else {
         m_cache.forget(credentials, place);

@@ -1,11 +1,11 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "Host/Authentication/CredentialCache.h"
-
 #include <gnutls/crypto.h>
 #include <gnutls/gnutls.h>
 
 #include <algorithm>
 #include <stdexcept>
+
+#include "Host/Authentication/Authentication.h"
 
 namespace host {
 
@@ -49,16 +49,12 @@ CredentialCache::Digest CredentialCache::digestOf(const Credentials& credentials
     return digest;
 }
 
-std::optional<User> CredentialCache::find(const Credentials& credentials, const std::string& place) {
+std::optional<CredentialCache::Known> CredentialCache::find(const Credentials& credentials,
+                                                            const std::string& place) {
     const utils::Mutex::AutoLocker lock(m_mutex);
     const auto found = m_entries.find(digestOf(credentials, place));
-    if (found == m_entries.end() || found->second.expires <= Clock::now()) return std::nullopt;
-    return found->second.user;
-}
-
-bool CredentialCache::knows(const Credentials& credentials, const std::string& place) {
-    const utils::Mutex::AutoLocker lock(m_mutex);
-    return m_entries.contains(digestOf(credentials, place));
+    if (found == m_entries.end()) return std::nullopt;
+    return Known{found->second.user, found->second.expires > Clock::now()};
 }
 
 void CredentialCache::remember(const Credentials& credentials, const std::string& place, const User& user,

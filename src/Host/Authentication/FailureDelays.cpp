@@ -1,10 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "Host/Authentication/FailureDelays.h"
-
 #include <arpa/inet.h>
 
 #include <algorithm>
 #include <array>
+
+#include "Host/Authentication/Authentication.h"
 
 namespace host {
 

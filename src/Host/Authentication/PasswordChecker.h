@@ -1,9 +1,13 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include <map>
 #include <optional>
 #include <string>
 #include <vector>
+
+#include "Utils/Os/Linux/Thread.h"
+#include "Utils/ThreadAnnotations.h"
 
 namespace host {
 
@@ -49,5 +53,43 @@ class PamChecker : public PasswordChecker {
 
 /// What a user of the system may do. An unknown one may do nothing.
 User systemUser(const std::string& name, const std::vector<std::string>& readers);
+
+/// A user as the users file has it. One per line: `name:hash:role`, the hash as of crypt(3), the role "admin"
+/// or "reader"; empty lines and lines that begin with # are passed over.
+struct UserEntry {
+    std::string hash;
+    bool isAdministrator = false;
+};
+
+using UserEntries = std::map<std::string, UserEntry>;
+
+/// Reads the file. Throws std::runtime_error that says what is wrong: it cannot be read, it is open to group
+/// or others, or a line (by its number) has not the form above.
+UserEntries readUsersFile(const std::string& path);
+
+/// Writes the file anew, mode 0600, in one step; makes its directory when it is missing. Throws
+/// std::runtime_error.
+void writeUsersFile(const std::string& path, const UserEntries& users);
+
+/// Whether the name can stand in the file.
+bool isUserName(const std::string& name);
+
+/// A fresh hash of the password, by the strongest method of crypt(3). Throws std::runtime_error.
+std::string hashPassword(const std::string& password);
+
+/// Checks passwords against a users file. An unknown user takes as long as a wrong password.
+class UsersFile : public PasswordChecker {
+  public:
+    explicit UsersFile(std::string path);
+
+    std::optional<User> check(const Credentials& credentials, const std::string& address) override;
+    void reload() override;
+
+  private:
+    const std::string m_path;
+    utils::Mutex m_mutex;
+    UserEntries m_users QUENX_GUARDED_BY(m_mutex);
+    std::string m_decoy QUENX_GUARDED_BY(m_mutex);  ///< a hash that no password has
+};
 
 }  // namespace host

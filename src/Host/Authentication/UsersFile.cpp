@@ -1,6 +1,4 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "Host/Authentication/UsersFile.h"
-
 #include <crypt.h>
 #include <fcntl.h>
 #include <gnutls/crypto.h>
@@ -15,6 +13,9 @@
 #include <fstream>
 #include <sstream>
 #include <stdexcept>
+
+#include "Host/Authentication/PasswordChecker.h"
+#include "Utils/Os/Linux/Descriptor.h"
 
 namespace host {
 
@@ -57,7 +58,8 @@ UserEntry readEntry(const std::string& path, std::size_t number, const std::stri
     return entry;
 }
 
-/// The file's owner and mode decide who can let himself in.
+/// Whoever can write the file can make himself an administrator, and whoever can read it can guess passwords
+/// without being slowed down.
 void checkMode(const std::string& path) {
     struct stat status {};
     if (::stat(path.c_str(), &status) != 0) {
@@ -109,13 +111,11 @@ void writeUsersFile(const std::string& path, const UserEntries& users) {
     // Written beside and renamed over it, so that a reader finds the old file or the new one, never half.
     const std::string fresh = path + ".new";
     ::unlink(fresh.c_str());
-    const int fd = ::open(fresh.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0600);
-    if (fd < 0) failToWrite(fresh, errno);
-    const bool written =
-        ::write(fd, text.data(), text.size()) == static_cast<ssize_t>(text.size()) && ::fsync(fd) == 0;
-    const int reason = errno;
-    ::close(fd);
-    if (!written) failToWrite(fresh, reason);
+    const os::Descriptor file(::open(fresh.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0600));
+    if (file.number() < 0 ||
+        ::write(file.number(), text.data(), text.size()) != static_cast<ssize_t>(text.size()) ||
+        ::fsync(file.number()) != 0)
+        failToWrite(fresh, errno);
     if (::rename(fresh.c_str(), path.c_str()) != 0) failToWrite(path, errno);
 }
 
@@ -142,19 +142,18 @@ void UsersFile::reload() {
     m_decoy = std::move(decoy);
 }
 
-UserEntry UsersFile::find(const std::string& name, bool& known) {
-    const utils::Mutex::AutoLocker lock(m_mutex);
-    const auto found = m_users.find(name);
-    known = found != m_users.end();
-    return known ? found->second : UserEntry{m_decoy, false};
-}
-
 std::optional<User> UsersFile::check(const Credentials& credentials, const std::string&) {
-    bool known = false;
-    const UserEntry entry = find(credentials.user, known);
+    bool isKnown = false;
+    UserEntry entry;
+    {
+        const utils::Mutex::AutoLocker lock(m_mutex);
+        const auto found = m_users.find(credentials.user);
+        isKnown = found != m_users.end();
+        entry = isKnown ? found->second : UserEntry{m_decoy, false};
+    }
     // The hash of an unknown user is checked as well: a fast answer would tell who exists.
-    const bool right = sameHash(crypted(credentials.password, entry.hash), entry.hash);
-    if (!known || !right) return std::nullopt;
+    const bool isRight = sameHash(crypted(credentials.password, entry.hash), entry.hash);
+    if (!isKnown || !isRight) return std::nullopt;
     return User{credentials.user, entry.isAdministrator, true};
 }
 

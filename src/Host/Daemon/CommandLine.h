@@ -10,11 +10,11 @@ namespace host {
 
 /// What `quenx-cimd passwd` is to do.
 struct PasswdRequest {
-    std::string usersFile;
     std::string user;
+    std::string usersFile;
     bool isReader = false;
-    bool remove = false;
-    bool isAsked = false;  ///< whether the configuration has the daemon ask a users file
+    bool isRemoval = false;
+    AuthenticationSettings configured;  ///< what a daemon with the same configuration asks
 };
 
 /// What the command line asks for.
@@ -27,5 +27,13 @@ struct CommandLine {
 
 /// Reads the options over the configuration file over the defaults. Prints help and mistakes itself.
 CommandLine readCommandLine(int argc, const char* const* argv);
+
+/// `quenx-cimd --check-config`: looks at everything that a start would need, without starting. Says each
+/// thing that is wrong; returns the exit status, 0 or 2.
+int checkConfiguration(const Settings& settings);
+
+/// `quenx-cimd passwd`: asks for a password on the terminal, or reads a line where there is none, and writes
+/// the users file. Returns the exit status, having said what went wrong.
+int runPasswd(const PasswdRequest& request);
 
 }  // namespace host

@@ -1,6 +1,4 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "Host/Daemon/ConfigCheck.h"
-
 #include <unistd.h>
 
 #include <cerrno>
@@ -10,12 +8,13 @@
 #include <iostream>
 #include <stdexcept>
 
-#include "Host/Authentication/UsersFile.h"
-#include "Host/Daemon/Providers.h"
-#include "Host/Server/Listener.h"
-#include "Host/Server/TlsIdentity.h"
+#include "Host/Authentication/PasswordChecker.h"
+#include "Host/Daemon/CommandLine.h"
+#include "Host/Daemon/Daemon.h"
+#include "Host/Server/ServerCertificate.h"
 #include "MidAPI/Simulator/Simulator.h"
 #include "MidAPI/ma.h"
+#include "Utils/Os/Linux/Descriptor.h"
 
 namespace host {
 
@@ -23,31 +22,28 @@ namespace {
 
 namespace fs = std::filesystem;
 
-void checkTls(const TlsSettings& settings) {
-    if (!areTlsFilesToBeMade(settings)) TlsIdentity(settings.certificate, settings.key);
-}
-
-void requireConfiguration(const std::string& path) {
-    if (!path.empty() && ::access(path.c_str(), R_OK) != 0) {
-        throw std::runtime_error("Cannot read " + path + ": " + std::strerror(errno) +
-                                 ". Check providers.configuration.");
-    }
-}
-
-void checkAdapters(const Settings& settings) {
-    if (settings.adapters.empty()) {
-        ma::enumerateAdapters();
-    } else {
-        ma::Simulator(settings.adapters, settings.adapterState);
-    }
-}
-
-void checkLockFile(const std::string& file) {
+/// Whether a daemon holds the lock file. Does not make it where it is missing.
+bool isDaemonRunning(const std::string& file) {
+    if (fs::exists(file)) return !LockFile(file).isHeld();
     const fs::path directory = fs::absolute(file).parent_path();
     if (!fs::is_directory(directory)) {
         throw std::runtime_error("daemon.lock_file is " + file + ", but there is no directory " +
                                  directory.string() + ". Make it, or set daemon.lock_file to another file.");
     }
+    return false;
+}
+
+void checkPort(const std::string& address, std::uint16_t port, bool isRestart) {
+    try {
+        const os::Descriptor listener(openListener(address, port));
+    } catch (const ListenError& error) {
+        // The daemon that this one would replace is likely the one that listens there.
+        if (!isRestart || error.code() != EADDRINUSE) throw;
+    }
+}
+
+void checkTls(const TlsSettings& settings) {
+    if (!areTlsFilesToBeMade(settings)) ServerCertificate(settings.certificate, settings.key);
 }
 
 void checkAuthentication(const AuthenticationSettings& settings) {
@@ -55,9 +51,31 @@ void checkAuthentication(const AuthenticationSettings& settings) {
     if (settings.method == "users") {
         readUsersFile(settings.usersFile);
     } else if (!fs::exists(kService)) {
+        // It can work: "other" is strict on most systems, but whom it lets in is not this program's choice.
         std::cerr << "quenx-cimd: Warning: " << kService
                   << " does not exist, so PAM applies its service \"other\". "
                   << "Copy the file from the installation.\n";
+    }
+}
+
+void checkProviders(const Settings& settings) {
+    core::ProviderLibraries providers;
+    loadProviders(providers, settings.providers);
+}
+
+void checkProviderConfiguration(const std::string& path) {
+    if (!path.empty() && ::access(path.c_str(), R_OK) != 0) {
+        throw std::runtime_error("Cannot read " + path + ": " + std::strerror(errno) +
+                                 ". Check providers.configuration.");
+    }
+}
+
+void checkAdapters(const Settings& settings) {
+    // As a start does it: reading the description is what finds its mistakes.
+    if (settings.adapters.empty()) {
+        ma::enumerateAdapters();
+    } else {
+        ma::Simulator(settings.adapters, settings.adapterState);
     }
 }
 
@@ -65,6 +83,7 @@ void checkAuthentication(const AuthenticationSettings& settings) {
 
 int checkConfiguration(const Settings& settings) {
     int status = 0;
+    // Each step by itself, so that one run tells all that is wrong.
     const auto check = [&](const std::function<void()>& step) {
         try {
             step();
@@ -73,16 +92,16 @@ int checkConfiguration(const Settings& settings) {
             status = 2;
         }
     };
-    check([&] { Listener::checkAddress(settings.listen.address); });
-    if (settings.listen.https) check([&] { checkTls(settings.tls); });
+    const ListenSettings& listen = settings.listen;
+    bool isRunning = false;
+    check([&] { isRunning = isDaemonRunning(settings.lockFile); });
+    if (listen.https) check([&] { checkPort(listen.address, listen.httpsPort, isRunning); });
+    if (listen.http) check([&] { checkPort(listen.address, listen.httpPort, isRunning); });
+    if (listen.https) check([&] { checkTls(settings.tls); });
     check([&] { checkAuthentication(settings.authentication); });
-    check([&] { requireConfiguration(settings.providerConfiguration); });
-    check([&] {
-        core::ProviderLibraries providers;
-        loadProviders(providers, settings.providers);
-    });
+    check([&] { checkProviderConfiguration(settings.providerConfiguration); });
+    check([&] { checkProviders(settings); });
     check([&] { checkAdapters(settings); });
-    check([&] { checkLockFile(settings.lockFile); });
     if (status == 0) std::cout << "The configuration is valid.\n";
     return status;
 }

@@ -1,27 +1,95 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Host/Daemon/Daemon.h"
 
+#include <cerrno>
+#include <stdexcept>
+#include <system_error>
+
+#include "Framework/Classes/CimBroker.h"
 #include "Framework/Classes/InstanceReaper.h"
-#include "Host/Authentication/Authentication.h"
-#include "Host/Authentication/UsersFile.h"
-#include "Host/Daemon/Providers.h"
 #include "Host/Daemon/Report.h"
-#include "Host/Daemon/RunningJobs.h"
 #include "Host/Operations/Dispatcher.h"
 #include "Host/Operations/InteropNamespace.h"
-#include "Host/Server/Listener.h"
-#include "Host/Server/TlsIdentity.h"
+#include "Host/Server/ServerCertificate.h"
 #include "MidAPI/ma.h"
+#include "Providers/Schema/ValueMaps.h"
 #include "Utils/Os/Linux/linux.h"
 
 namespace host {
 
-Daemon::Daemon(const Settings& settings) : m_settings(settings), m_session(settings.providerConfiguration) {
+namespace {
+
+template <class T>
+T valueOf(const core::InstanceValue& instance, std::string_view name) {
+    const core::PropertyValue* property = instance.find(name);
+    const core::CimScalar* scalar = property == nullptr ? nullptr : property->value.scalar();
+    const T* value = scalar == nullptr ? nullptr : std::get_if<T>(scalar);
+    return value == nullptr ? T() : *value;
+}
+
+/// The updates that the providers are working on: "Job#1 at 42 %, Job#2 at 7 %"; empty when there are none.
+std::string runningUpdates(core::CimOperations& operations) {
+    std::string text;
+    try {
+        // By the standard's class, so that jobs of any provider count.
+        for (const core::InstanceValue& job : operations.enumerateInstances("CIM_ConcreteJob")) {
+            const auto state = valueOf<std::uint64_t>(job, "JobState");
+            if (state != JobStateStarting && state != JobStateRunning) continue;
+            text += (text.empty() ? "" : ", ") + valueOf<std::string>(job, "InstanceID") + " at " +
+                    std::to_string(valueOf<std::uint64_t>(job, "PercentComplete")) + " %";
+        }
+    } catch (const core::CimError&) {
+        // No provider here serves jobs.
+    }
+    return text;
+}
+
+}  // namespace
+
+LockFile::LockFile(const std::string& path) try : m_path(path), m_lock(path, os::FileLock::Mode::Try) {
+} catch (const std::system_error& error) {
+    throw std::runtime_error("Cannot write the lock file " + path + ": " + error.code().message() + ". " +
+                             (error.code().value() == EACCES
+                                  ? "Run as root, or set daemon.lock_file."
+                                  : "Set daemon.lock_file to a file that can be written."));
+}
+
+void LockFile::require() const {
+    if (isHeld()) return;
+    const pid_t holder = m_lock.holder();
+    // A daemon that has just taken the lock has not left its number yet.
+    throw std::runtime_error("quenx-cimd is already running: " +
+                             (holder == 0 ? "another process" : "process " + std::to_string(holder)) +
+                             " holds " + m_path + ". Stop it, or set daemon.lock_file to another file.");
+}
+
+void loadProviders(core::ProviderLibraries& providers, const std::string& directory) {
+    const std::string advice = ". Set providers.directory to the directory of libQuenx_SoftwareUpdate.so.";
+    try {
+        providers.load(directory);
+    } catch (const std::system_error& error) {
+        throw std::runtime_error("Cannot read the provider directory " + directory + ": " +
+                                 error.code().message() + advice);
+    }
+    for (const auto& problem : providers.problems())
+        reportProblem("Cannot load " + problem.file + ": " + problem.reason);
+    std::string names;
+    for (const core::AgentUse& each : core::GetCimBroker()->useAgents())
+        names += (names.empty() ? "" : ", ") + each.agent().getProviderName();
+    if (names.empty()) throw std::runtime_error("There is no provider library in " + directory + advice);
+    report("Loaded the providers " + names + ".");
+}
+
+Daemon::Daemon(const Settings& settings)
+    : m_settings(settings), m_lock(settings.lockFile), m_session(settings.providerConfiguration) {
+    m_lock.require();
+    // Before the providers come, which ask for the adapters as soon as they are called.
     if (!m_settings.adapters.empty()) ma::configureSimulator(m_settings.adapters, m_settings.adapterState);
     loadProviders(m_session.libraries(), m_settings.providers);
     m_dispatcher = makeDispatcher();
     m_authentication = makeAuthentication();
     m_server = std::make_unique<HttpServer>(m_settings.limits, *m_dispatcher, *m_authentication);
+    // Last, so that whoever can connect is also answered.
     listen();
 }
 
@@ -31,13 +99,13 @@ std::unique_ptr<Dispatcher> Daemon::makeDispatcher() const {
     const auto implementation = m_session.operations();
     Dispatcher::Namespaces namespaces{implementation};
     std::vector<std::string> names{implementation->getNamespace()};
+    // Clients look for the registered profiles under either name (DSP1033 7.1), and few try both.
     for (const char* name : {"interop", "root/interop"}) {
         if (!core::sameName(name, names.front())) names.emplace_back(name);
     }
-    const auto model = std::make_shared<InteropModel>(names, os::getHostname());
-    for (std::size_t i = 1; i < names.size(); ++i) {
+    const InteropModel model(names, os::getHostname());
+    for (std::size_t i = 1; i < names.size(); ++i)
         namespaces.push_back(std::make_shared<InteropNamespace>(names[i], implementation, model));
-    }
     return std::make_unique<Dispatcher>(std::move(namespaces), m_settings.pulls);
 }
 
@@ -54,17 +122,17 @@ std::unique_ptr<Authentication> Daemon::makeAuthentication() const {
 
 void Daemon::listenOn(std::uint16_t port, bool tls) {
     const std::string& address = m_settings.listen.address;
-    Listener listener(address, port);
-    if (!m_places.empty()) m_places += " ";
-    m_places += tls ? "https://" : "http://";
-    m_places += address.find(':') == std::string::npos ? address : "[" + address + "]";
-    m_places += ":" + std::to_string(listener.port());
-    m_server->listen(std::move(listener), tls);
+    const std::uint16_t actualPort = m_server->listen(address, port, tls);
+    if (!m_addresses.empty()) m_addresses += " ";
+    m_addresses += tls ? "https://" : "http://";
+    // An IPv6 address stands in brackets in a URL (RFC 3986 3.2.2).
+    m_addresses += address.find(':') == std::string::npos ? address : "[" + address + "]";
+    m_addresses += ":" + std::to_string(actualPort);
 }
 
-void Daemon::readIdentity() {
-    m_server->setIdentity(
-        std::make_shared<const TlsIdentity>(m_settings.tls.certificate, m_settings.tls.key));
+void Daemon::readCertificate() {
+    m_server->setCertificate(
+        std::make_shared<const ServerCertificate>(m_settings.tls.certificate, m_settings.tls.key));
 }
 
 void Daemon::listen() {
@@ -73,7 +141,7 @@ void Daemon::listen() {
             report("Made a self-signed certificate for " + os::getHostname() +
                    ", localhost, 127.0.0.1 and ::1: " + m_settings.tls.certificate);
         }
-        readIdentity();
+        readCertificate();
         listenOn(m_settings.listen.httpsPort, true);
     }
     if (m_settings.listen.http) listenOn(m_settings.listen.httpPort, false);
@@ -88,8 +156,9 @@ void Daemon::reload() {
             reportProblem("Kept the old " + what + ". " + error.what());
         }
     };
+    // Each by itself: a certificate that cannot be read must not keep a removed user in.
     again("users", [this] { m_authentication->reload(); });
-    if (m_settings.listen.https) again("certificate and key", [this] { readIdentity(); });
+    if (m_settings.listen.https) again("certificate and key", [this] { readCertificate(); });
 }
 
 void Daemon::stopAccepting() {
@@ -100,9 +169,10 @@ std::string Daemon::unfinished() {
     if (const unsigned int requests = m_server->inFlight(); requests != 0) {
         return std::to_string(requests) + (requests == 1 ? " request" : " requests");
     }
+    // From here on no request can start an update, so there can only be fewer of them.
     m_dispatcher->shutDown();
-    const std::vector<RunningJob> jobs = runningJobs(*m_session.operations());
-    if (!jobs.empty()) return "the update of " + describe(jobs);
+    const std::string updates = runningUpdates(*m_session.operations());
+    if (!updates.empty()) return "the update of " + updates;
     return core::isReaperBusy() ? "an update whose job was deleted" : "";
 }
 

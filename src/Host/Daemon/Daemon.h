@@ -7,14 +7,35 @@
 #include "Framework/Requests/ProviderSession.h"
 #include "Host/Server/HttpServer.h"
 #include "Host/Settings.h"
+#include "Utils/Os/Linux/FileLock.h"
 
 namespace host {
+
+/// The lock that one daemon on the machine can hold; the file names its process. Given back when the process
+/// ends, however that is.
+class LockFile {
+  public:
+    /// Tries to take the lock. Throws std::runtime_error when the file cannot be written.
+    explicit LockFile(const std::string& path);
+
+    bool isHeld() const { return m_lock.isHeld(); }
+    /// Throws std::runtime_error with the holder's process id, when it is another process.
+    void require() const;
+
+  private:
+    const std::string m_path;
+    os::FileLock m_lock;
+};
+
+/// Loads the provider libraries of a directory. One that does not load is reported, and the others serve.
+/// Throws std::runtime_error when the directory cannot be read, or none of its libraries is a provider.
+void loadProviders(core::ProviderLibraries& providers, const std::string& directory);
 
 /// The object manager: providers, operations, server. Started by the constructor.
 class Daemon {
   public:
-    /// Throws std::runtime_error that says what is missing or wrong. A provider library that does not load is
-    /// only reported, as long as there is another.
+    /// Throws std::runtime_error that says what is missing or wrong, or that another daemon holds the lock
+    /// file. A provider library that does not load is only reported, as long as there is another.
     explicit Daemon(const Settings& settings);
     /// Ends connections and unloads the providers, which wait for what they still do.
     ~Daemon();
@@ -22,7 +43,7 @@ class Daemon {
     Daemon& operator=(const Daemon&) = delete;
 
     /// Where it listens, for a person: "https://127.0.0.1:5989".
-    const std::string& places() const { return m_places; }
+    const std::string& addresses() const { return m_addresses; }
 
     /// Reads certificate, key and users again, and reports what it has read. What cannot be read stays as it
     /// was.
@@ -37,12 +58,13 @@ class Daemon {
   private:
     std::unique_ptr<Dispatcher> makeDispatcher() const;
     std::unique_ptr<Authentication> makeAuthentication() const;
-    void readIdentity();
+    void readCertificate();
     void listen();
     void listenOn(std::uint16_t port, bool tls);
 
     const Settings m_settings;
-    std::string m_places;
+    const LockFile m_lock;
+    std::string m_addresses;
     // Destroyed last to first: the server lets go of its requests before the providers leave.
     core::ProviderSession m_session;
     std::unique_ptr<Dispatcher> m_dispatcher;

@@ -1,12 +1,12 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "Host/Daemon/PasswdCommand.h"
-
 #include <unistd.h>
 
+#include <filesystem>
 #include <iostream>
 #include <stdexcept>
 
-#include "Host/Authentication/UsersFile.h"
+#include "Host/Authentication/PasswordChecker.h"
+#include "Host/Daemon/CommandLine.h"
 #include "Utils/Os/Linux/EchoOff.h"
 
 namespace host {
@@ -21,7 +21,7 @@ std::string readLine() {
 }
 
 std::string ask(const char* prompt) {
-    const os::EchoOff hidden;
+    const os::EchoOff hidden;  // the terminal is put right again also when Ctrl-C ends the program
     std::cerr << prompt << std::flush;
     std::string line = readLine();
     std::cerr << '\n';
@@ -30,10 +30,26 @@ std::string ask(const char* prompt) {
 
 std::string newPassword() {
     if (::isatty(STDIN_FILENO) == 0) return readLine();
+    // Asked twice, since nobody sees what he types.
     std::string password = ask("New password: ");
     if (ask("Again: ") != password)
         throw std::runtime_error("The passwords do not match, so nothing was changed. Try again.");
     return password;
+}
+
+void removeUser(const PasswdRequest& request, UserEntries& users) {
+    if (users.erase(request.user) == 0) {
+        throw std::runtime_error("There is no user \"" + request.user + "\" in " + request.usersFile +
+                                 ". Check the name, and that --users names the right file.");
+    }
+}
+
+void setPassword(const PasswdRequest& request, UserEntries& users) {
+    const std::string password = newPassword();
+    if (password.empty())
+        throw std::runtime_error(
+            "The password is empty, so nothing was changed. Type at least one character.");
+    users[request.user] = {hashPassword(password), !request.isReader};
 }
 
 /// Says what it did.
@@ -43,35 +59,48 @@ void change(const PasswdRequest& request) {
                                  "\" cannot be a user name. Use 1 to 64 printable ASCII characters, without "
                                  "blanks or colons, and do not start with #.");
     }
+    // Read before the password is asked for, so that a broken file does not cost a password typed twice.
     UserEntries users;
     if (::access(request.usersFile.c_str(), F_OK) == 0) users = readUsersFile(request.usersFile);
-    std::string done = "Removed user";
-    std::string where = "from";
-    if (request.remove) {
-        if (users.erase(request.user) == 0) {
-            throw std::runtime_error("There is no user \"" + request.user + "\" in " + request.usersFile +
-                                     ". Check the name, and that --users names the right file.");
-        }
+    const bool isNew = !users.contains(request.user);
+    if (request.isRemoval) {
+        removeUser(request, users);
     } else {
-        const std::string password = newPassword();
-        if (password.empty())
-            throw std::runtime_error(
-                "The password is empty, so nothing was changed. Type at least one character.");
-        const bool isNew = !users.contains(request.user);
-        where = isNew ? "to" : "in";
-        done = std::string(isNew ? "Added " : "Changed ") + (request.isReader ? "reader" : "administrator");
-        users[request.user] = {hashPassword(password), !request.isReader};
+        setPassword(request, users);
     }
     writeUsersFile(request.usersFile, users);
-    std::cout << done << " \"" << request.user << "\" " << where << " " << request.usersFile << ".\n";
+    const std::string role = request.isReader ? "reader" : "administrator";
+    std::cout << (request.isRemoval ? "Removed user" : (isNew ? "Added " : "Changed ") + role) << " \""
+              << request.user << "\" "
+              << (request.isRemoval ? "from"
+                  : isNew           ? "to"
+                                    : "in")
+              << " " << request.usersFile << ".\n";
 }
 
+/// What keeps a daemon of this configuration from asking the file, and how to change that.
 void adviseAfter(const PasswdRequest& request) {
+    namespace fs = std::filesystem;
+    const AuthenticationSettings& configured = request.configured;
+    const std::string file = fs::absolute(request.usersFile).lexically_normal();
+    std::string is, set, options;
+    const auto add = [](std::string& text, const char* separator, const std::string& part) {
+        text += (text.empty() ? "" : separator) + part;
+    };
+    if (configured.method != "users") {
+        add(is, "", "auth.method is \"" + configured.method + "\"");
+        add(set, "", "method = \"users\"");
+        add(options, "", "--auth-method users");
+    }
+    if (file != fs::absolute(configured.usersFile).lexically_normal()) {
+        add(is, " and ", "auth.users_file is \"" + configured.usersFile + "\"");
+        add(set, " and ", "users_file = \"" + file + "\"");
+        add(options, " ", "--auth-users-file " + file);
+    }
     std::cout << "Reload a running quenx-cimd with: systemctl reload quenx-cimd (or send it SIGHUP)\n";
-    if (!request.isAsked) {
-        std::cout
-            << "auth.method is \"pam\", so this file is not used yet. Set method = \"users\" in [auth], "
-               "or start quenx-cimd with --auth-method users.\n";
+    if (!is.empty()) {
+        std::cout << is << ", so this file is not used yet. Set " << set
+                  << " in [auth], or start quenx-cimd with " << options << ".\n";
     }
 }
 

@@ -1,6 +1,13 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Host/Daemon/Report.h"
 
+#include <sys/socket.h>
+#include <sys/un.h>
+#include <unistd.h>
+
+#include <cstddef>
+#include <cstdlib>
+#include <cstring>
 #include <iostream>
 
 #include "Utils/Log.h"
@@ -24,6 +31,23 @@ void report(const std::string& text) {
 void reportProblem(const std::string& text) {
     say(text);
     QUENX_ERROR_TEXT(text);
+}
+
+void notifyServiceManager(const std::string& state) {
+    const char* path = std::getenv("NOTIFY_SOCKET");
+    sockaddr_un address{};
+    if (path == nullptr || std::strlen(path) >= sizeof address.sun_path) return;
+    address.sun_family = AF_UNIX;
+    const std::size_t length = std::strlen(path);
+    std::memcpy(address.sun_path, path, length);
+    // A leading @ stands for the NUL of the abstract namespace.
+    if (address.sun_path[0] == '@') address.sun_path[0] = '\0';
+    // Two calls and no reply do not need the library of systemd, which is missing where there is no systemd.
+    const int socket = ::socket(AF_UNIX, SOCK_DGRAM | SOCK_CLOEXEC, 0);
+    if (socket < 0) return;
+    ::sendto(socket, state.data(), state.size(), MSG_NOSIGNAL, reinterpret_cast<const sockaddr*>(&address),
+             static_cast<socklen_t>(offsetof(sockaddr_un, sun_path) + length));
+    ::close(socket);
 }
 
 }  // namespace host

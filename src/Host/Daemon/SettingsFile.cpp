@@ -6,6 +6,7 @@
 #include "Host/Daemon/SettingsField.h"
 #include "MidAPI/Toml.h"
 #include "Utils/Os/Linux/linux.h"
+#include "Utils/Utils.h"
 
 namespace host {
 
@@ -52,6 +53,7 @@ void setField(const std::vector<SettingsField>& fields, const std::string& key, 
     if (field == fields.end())
         throw std::runtime_error(place + ": there is no setting " + key +
                                  ". See quenx-cimd --help for all settings.");
+    // What a field says of a wrong value knows nothing of files.
     try {
         if (field->isList()) {
             setList(*field, node, place);
@@ -64,13 +66,27 @@ void setField(const std::vector<SettingsField>& fields, const std::string& key, 
     }
 }
 
+/// The mistake that the parser describes least well: `method = users`, where TOML wants a text in quotes.
+std::string hintAt(std::string_view text, std::size_t line) {
+    for (; line > 1; --line)
+        text.remove_prefix(std::min(text.find('\n'), text.size() - 1) + 1);
+    text = text.substr(0, text.find_first_of("#\r\n"));
+    const std::size_t equals = text.find('=');
+    if (equals == std::string_view::npos) return "";
+    const std::string value = utils::trim(text.substr(equals + 1));
+    if (value.empty() || value.find_first_of("\"'[{") != std::string::npos) return "";
+    return ". A text must stand in quotes: " + utils::trim(text.substr(0, equals)) + " = \"" + value + "\"";
+}
+
 toml::table parse(const std::string& file) {
     const auto bytes = os::readWholeFile(file, SIZE_MAX);
     if (!bytes) throw std::runtime_error(file + ": there is no such file");
+    const std::string_view text(reinterpret_cast<const char*>(bytes->data()), bytes->size());
     try {
-        return ma::parseToml({reinterpret_cast<const char*>(bytes->data()), bytes->size()});
+        return ma::parseToml(text);
     } catch (const ma::TomlError& error) {
-        throw std::runtime_error(file + ":" + std::to_string(error.line()) + ": " + error.what());
+        throw std::runtime_error(file + ":" + std::to_string(error.line()) + ": " + error.what() +
+                                 hintAt(text, error.line()));
     }
 }
 

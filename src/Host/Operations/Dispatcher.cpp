@@ -3,8 +3,6 @@
 
 #include <new>
 
-#include "CimXml/ValueReader.h"
-
 namespace host {
 
 namespace {
@@ -20,26 +18,10 @@ void requirePrivilege(Privilege privilege, const Caller& caller) {
     }
 }
 
-/// An argument as the message has it: of the type that the client states, else left to the declaration.
-core::Argument argumentOf(const cimxml::RawArgument& raw) {
-    const auto& data = raw.value.data;
-    const bool isArray = std::holds_alternative<std::vector<std::string>>(data) ||
-                         std::holds_alternative<std::vector<core::CimPath>>(data);
-    const bool isReference = std::holds_alternative<core::CimPath>(data) ||
-                             std::holds_alternative<std::vector<core::CimPath>>(data);
-    const core::CimType open = isReference ? core::CimType::Reference : core::CimType::String;
-    auto value = cimxml::typedValueOf(raw.value, raw.value.type.value_or(open), isArray);
-    if (!value) {
-        throw CimError(CimStatus::InvalidParameter,
-                       "parameter " + raw.name + " does not hold a value of its stated type");
-    }
-    return {raw.name, std::move(*value), !raw.value.type};
-}
-
 }  // namespace
 
 Dispatcher::Dispatcher(Namespaces namespaces, const PullLimits& limits)
-    : m_namespaces(std::move(namespaces)), m_pulls(limits) {}
+    : m_namespaces(std::move(namespaces)), m_enumerations(limits) {}
 
 core::CimOperations& Dispatcher::findNamespace(const std::string& name) const {
     for (const auto& each : m_namespaces) {
@@ -51,22 +33,23 @@ core::CimOperations& Dispatcher::findNamespace(const std::string& name) const {
 IntrinsicResult Dispatcher::call(const cimxml::IntrinsicCall& call, const Caller& caller) {
     const Operation* operation = findOperation(call.operation);
     if (operation != nullptr) requirePrivilege(operation->privilege, caller);
+    // The namespace before the operation: clients probe for namespaces with whatever operation they like.
     core::CimOperations& target = findNamespace(call.namespaceName);
     if (operation == nullptr) {
         throw CimError(CimStatus::NotSupported, "operation " + call.operation + " is not supported");
     }
-    return operation->handler({target, caller, m_pulls, operation->name},
-                              Parameters(call, operation->parameters));
+    return operation->handler({target, caller, m_enumerations}, Parameters(call, operation->parameters));
 }
 
 core::MethodResult Dispatcher::call(const cimxml::MethodCall& call, const Caller& caller) {
     // Before anything else, so that a reader learns nothing of what there is to call.
-    requirePrivilege(methodPrivilege(), caller);
+    requirePrivilege(kMethodPrivilege, caller);
     core::CimOperations& target = findNamespace(call.object.getNamespace());
-    std::vector<core::Argument> arguments;
-    for (const cimxml::RawArgument& each : call.arguments)
-        arguments.push_back(argumentOf(each));
-    return target.invokeMethod(call.object, call.method, arguments);
+    if (!call.mistypedArgument.empty()) {
+        throw CimError(CimStatus::InvalidParameter,
+                       "parameter " + call.mistypedArgument + " does not hold a value of its stated type");
+    }
+    return target.invokeMethod(call.object, call.method, call.arguments);
 }
 
 cimxml::Response Dispatcher::dispatch(const cimxml::Request& request, const Caller& caller) {
@@ -87,6 +70,7 @@ cimxml::Response Dispatcher::dispatch(const cimxml::Request& request, const Call
     } catch (const CimError& error) {
         response.content = ErrorResult{error.status(), error.what()};
     } catch (const std::bad_alloc&) {
+        // Most of what the request took is free again, so the small answer fits.
         response.content = ErrorResult{CimStatus::Failed, "out of memory"};
     } catch (const std::exception& error) {
         response.content = ErrorResult{CimStatus::Failed, error.what()};

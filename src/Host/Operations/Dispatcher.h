@@ -30,7 +30,7 @@ class Dispatcher {
     core::CimOperations& findNamespace(const std::string& name) const;
 
     const Namespaces m_namespaces;
-    PullContexts m_pulls;
+    OpenEnumerations m_enumerations;
     std::atomic<bool> m_shuttingDown{false};
 };
 

@@ -1,7 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 #include <algorithm>
 
-#include "Host/Operations/ClassAnswer.h"
 #include "Host/Operations/Operations.h"
 
 namespace host {
@@ -10,54 +9,95 @@ namespace {
 
 using cimxml::IntrinsicResult;
 using cimxml::ResultKind;
+using core::CimError;
+using core::CimStatus;
 
 const core::PropertyFilter kNoProperties{std::vector<std::string>()};
 
-/// The properties of the named class only, narrowed by the client's list.
+/// The properties of the named class only, narrowed by the client's list: what subclasses add is left out.
 core::PropertyFilter shallowFilter(const core::ClassChain& chain, const core::PropertyFilter& wanted) {
-    std::vector<std::string> names = propertyNames(chain);
-    std::erase_if(names, [&](const std::string& name) { return !core::isWanted(wanted, name); });
+    std::vector<std::string> names;
+    for (const auto& declaration : chain) {
+        for (const core::PropertyDeclaration& property : declaration->properties) {
+            if (core::isWanted(wanted, property.name)) names.push_back(property.name);
+        }
+    }
     return names;
 }
 
-}  // namespace
+/// The class that first declared each property. A chain ends with the root, so the last one named is the
+/// first.
+std::map<std::string, std::string> originsOf(const core::ClassChain& chain) {
+    std::map<std::string, std::string> origins;
+    for (const auto& declaration : chain) {
+        for (const core::PropertyDeclaration& property : declaration->properties)
+            origins[core::foldName(property.name)] = declaration->name;
+    }
+    return origins;
+}
 
-void addOrigins(core::CimOperations& target, IntrinsicResult& result) {
+// LocalOnly and IncludeQualifiers are accepted and change nothing: DSP0200 5.4.2.2 deprecates them for
+// instances, and lets a server return all properties, and none of the qualifiers.
+
+IntrinsicResult instancesResult(const OperationContext& context, const Parameters& parameters,
+                                ResultKind kind, std::vector<core::InstanceValue> instances) {
+    IntrinsicResult result;
+    result.kind = kind;
+    result.instances = std::move(instances);
+    if (!parameters.flag("IncludeClassOrigin", false)) return result;
+    // By class, since a list may hold thousands of instances of a few classes.
     auto origins = std::make_shared<cimxml::Origins>();
     for (const core::InstanceValue& instance : result.instances) {
         const std::string& name = instance.path.getClassName();
         const auto [entry, isNew] = origins->try_emplace(core::foldName(name));
-        if (isNew) entry->second = originsOf(target.getClass(name));
+        if (isNew) entry->second = originsOf(context.target.getClass(name));
     }
     result.origins = std::move(origins);
-}
-
-IntrinsicResult getInstance(const OperationContext& context, const Parameters& parameters) {
-    IntrinsicResult result;
-    result.kind = ResultKind::Instance;
-    result.instances.push_back(
-        context.target.getInstance(parameters.path("InstanceName"), parameters.list("PropertyList")));
-    if (parameters.flag("IncludeClassOrigin", false)) addOrigins(context.target, result);
     return result;
 }
 
-IntrinsicResult enumerateInstances(const OperationContext& context, const Parameters& parameters) {
+IntrinsicResult pathsResult(ResultKind kind, std::vector<core::CimPath> paths) {
     IntrinsicResult result;
-    result.kind = ResultKind::NamedInstances;
+    result.kind = kind;
+    result.paths = std::move(paths);
+    return result;
+}
+
+/// The object whose neighbours are asked for; the operations that open an enumeration call it InstanceName.
+core::CimPath sourceOf(const OperationContext& context, const Parameters& parameters) {
+    const std::string_view name = parameters.isGiven("ObjectName") ? "ObjectName" : "InstanceName";
+    if (parameters.isClassName(name)) {
+        requireClass(context.target, parameters.className(name), CimStatus::InvalidClass);
+        throw CimError(CimStatus::NotSupported, "associations of classes are not served");
+    }
+    return parameters.path(name);
+}
+
+core::AssociationFilter filterOf(const Parameters& parameters) {
+    return {parameters.className("AssocClass"), parameters.className("ResultClass"), parameters.text("Role"),
+            parameters.text("ResultRole")};
+}
+
+}  // namespace
+
+IntrinsicResult getInstance(const OperationContext& context, const Parameters& parameters) {
+    return instancesResult(
+        context, parameters, ResultKind::Instance,
+        {context.target.getInstance(parameters.path("InstanceName"), parameters.list("PropertyList"))});
+}
+
+IntrinsicResult enumerateInstances(const OperationContext& context, const Parameters& parameters) {
     const std::string className = parameters.className("ClassName");
     core::PropertyFilter filter = parameters.list("PropertyList");
     if (!parameters.flag("DeepInheritance", true))
         filter = shallowFilter(context.target.getClass(className), filter);
-    result.instances = context.target.enumerateInstances(className, filter);
-    if (parameters.flag("IncludeClassOrigin", false)) addOrigins(context.target, result);
-    return result;
+    return instancesResult(context, parameters, ResultKind::NamedInstances,
+                           context.target.enumerateInstances(className, filter));
 }
 
 IntrinsicResult enumerateInstanceNames(const OperationContext& context, const Parameters& parameters) {
-    IntrinsicResult result;
-    result.kind = ResultKind::InstanceNames;
-    result.paths = context.target.enumerateInstanceNames(parameters.className("ClassName"));
-    return result;
+    return pathsResult(ResultKind::InstanceNames,
+                       context.target.enumerateInstanceNames(parameters.className("ClassName")));
 }
 
 IntrinsicResult deleteInstance(const OperationContext& context, const Parameters& parameters) {
@@ -65,21 +105,45 @@ IntrinsicResult deleteInstance(const OperationContext& context, const Parameters
     return {};
 }
 
+// Clients cannot create or modify anything here. One that is wrong about the class or the instance, too,
+// hears that first, as it would from a server that can.
+
 IntrinsicResult createInstance(const OperationContext& context, const Parameters& parameters) {
-    const std::string& className = parameters.instance("NewInstance")->className;
-    requireClass(context.target, className, core::CimStatus::InvalidClass);
-    throw core::CimError(core::CimStatus::NotSupported, "instances of " + className + " cannot be created");
+    const std::string& className = parameters.instance("NewInstance").className;
+    requireClass(context.target, className, CimStatus::InvalidClass);
+    throw CimError(CimStatus::NotSupported, "instances of " + className + " cannot be created");
 }
 
 IntrinsicResult modifyInstance(const OperationContext& context, const Parameters& parameters) {
-    const cimxml::InstanceBody& body = *parameters.instance("ModifiedInstance");
-    if (!body.path) {
-        throw core::CimError(core::CimStatus::InvalidParameter, "ModifiedInstance names no instance");
-    }
-    // A client that is wrong about the instance hears that first.
+    const cimxml::InstanceBody& body = parameters.instance("ModifiedInstance");
+    if (!body.path) throw CimError(CimStatus::InvalidParameter, "ModifiedInstance names no instance");
     context.target.getInstance(*body.path, kNoProperties);
-    throw core::CimError(core::CimStatus::NotSupported,
-                         "instances of " + body.path->getClassName() + " cannot be modified");
+    throw CimError(CimStatus::NotSupported,
+                   "instances of " + body.path->getClassName() + " cannot be modified");
+}
+
+IntrinsicResult associators(const OperationContext& context, const Parameters& parameters) {
+    const core::CimPath source = sourceOf(context, parameters);
+    return instancesResult(
+        context, parameters, ResultKind::ObjectsWithPath,
+        context.target.associators(source, filterOf(parameters), parameters.list("PropertyList")));
+}
+
+IntrinsicResult associatorNames(const OperationContext& context, const Parameters& parameters) {
+    const core::CimPath source = sourceOf(context, parameters);
+    return pathsResult(ResultKind::ObjectPaths, context.target.associatorNames(source, filterOf(parameters)));
+}
+
+IntrinsicResult references(const OperationContext& context, const Parameters& parameters) {
+    const core::CimPath source = sourceOf(context, parameters);
+    return instancesResult(
+        context, parameters, ResultKind::ObjectsWithPath,
+        context.target.references(source, filterOf(parameters), parameters.list("PropertyList")));
+}
+
+IntrinsicResult referenceNames(const OperationContext& context, const Parameters& parameters) {
+    const core::CimPath source = sourceOf(context, parameters);
+    return pathsResult(ResultKind::ObjectPaths, context.target.referenceNames(source, filterOf(parameters)));
 }
 
 }  // namespace host

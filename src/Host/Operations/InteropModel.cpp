@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "Host/Operations/InteropModel.h"
-
-#include <algorithm>
+// What the object manager serves of itself: CIM_ObjectManager, and one CIM_Namespace for each namespace. No
+// provider has these classes, so they are declared here, with the properties that are filled in alone.
+#include "Host/Operations/InteropNamespace.h"
 
 namespace host {
 
@@ -9,35 +9,38 @@ namespace {
 
 using core::CimType;
 using core::CimValue;
-using core::ClassDeclaration;
 using core::PropertyDeclaration;
 
 constexpr const char* kManager = "CIM_ObjectManager";
 constexpr const char* kNamespace = "CIM_Namespace";
 constexpr const char* kManagerName = "quenx-cimd";
 
+PropertyDeclaration property(const char* name, CimType type) {
+    return {name, type, false, false, ""};
+}
 PropertyDeclaration text(const char* name) {
-    return {name, CimType::String, false, false, ""};
+    return property(name, CimType::String);
 }
 PropertyDeclaration key(const char* name) {
     return {name, CimType::String, false, true, ""};
 }
-PropertyDeclaration number(const char* name) {
-    return {name, CimType::Uint16, false, false, ""};
-}
 
-std::vector<ClassDeclaration> declarations() {
-    const PropertyDeclaration started{"Started", CimType::Boolean, false, false, ""};
+std::vector<core::ClassDeclaration> declarations() {
     const PropertyDeclaration states{"OperationalStatus", CimType::Uint16, true, false, ""};
-    return {
+    std::vector<core::ClassDeclaration> all{
         {"CIM_ManagedElement", "", false, {text("Caption"), text("Description"), text("ElementName")}, {}},
         {"CIM_ManagedSystemElement", "CIM_ManagedElement", false, {text("Name"), states}, {}},
         {"CIM_LogicalElement", "CIM_ManagedSystemElement", false, {}, {}},
-        {"CIM_EnabledLogicalElement", "CIM_LogicalElement", false, {number("EnabledState")}, {}},
+        {"CIM_EnabledLogicalElement",
+         "CIM_LogicalElement",
+         false,
+         {property("EnabledState", CimType::Uint16)},
+         {}},
         {"CIM_Service",
          "CIM_EnabledLogicalElement",
          false,
-         {key("SystemCreationClassName"), key("SystemName"), key("CreationClassName"), key("Name"), started},
+         {key("SystemCreationClassName"), key("SystemName"), key("CreationClassName"), key("Name"),
+          property("Started", CimType::Boolean)},
          {}},
         {"CIM_WBEMService", "CIM_Service", false, {}, {}},
         {kManager, "CIM_WBEMService", false, {text("Version")}, {}},
@@ -45,93 +48,66 @@ std::vector<ClassDeclaration> declarations() {
          "CIM_ManagedElement",
          false,
          {key("SystemCreationClassName"), key("SystemName"), key("ObjectManagerCreationClassName"),
-          key("ObjectManagerName"), key("CreationClassName"), key("Name"), number("ClassInfo")},
+          key("ObjectManagerName"), key("CreationClassName"), key("Name"),
+          property("ClassInfo", CimType::Uint16)},
          {}}};
-}
-
-/// Builds an instance row by row; what is a key also goes into the path.
-class InstanceBuilder {
-  public:
-    explicit InstanceBuilder(std::string className) : m_className(std::move(className)) {}
-
-    InstanceBuilder& key(const char* name, const std::string& value) {
-        m_keys.push_back({name, value});
-        m_instance.properties.push_back({name, CimValue::of(CimType::String, value), true, ""});
-        return *this;
-    }
-    InstanceBuilder& text(const char* name, const std::string& value) {
-        return add(name, CimValue::of(CimType::String, value));
-    }
-    InstanceBuilder& add(const char* name, CimValue value) {
-        m_instance.properties.push_back({name, std::move(value), false, ""});
-        return *this;
-    }
-    core::InstanceValue build() {
-        m_instance.path = core::CimPath(m_className, std::move(m_keys));
-        return std::move(m_instance);
-    }
-
-  private:
-    std::string m_className;
-    std::vector<core::CimKey> m_keys;
-    core::InstanceValue m_instance;
-};
-
-std::vector<ClassDeclaration> qualifiedDeclarations() {
-    std::vector<ClassDeclaration> all = declarations();
-    for (ClassDeclaration& each : all)
+    for (core::ClassDeclaration& each : all)
         core::addImpliedQualifiers(each);
     return all;
 }
 
+using Texts = std::vector<std::pair<const char*, std::string>>;
+using Values = std::vector<std::pair<const char*, CimValue>>;
+
+/// An instance whose keys are texts.
+core::InstanceValue makeInstance(const char* className, const Texts& keys, const Values& others) {
+    core::InstanceValue instance;
+    std::vector<core::CimKey> pathKeys;
+    for (const auto& [name, value] : keys) {
+        pathKeys.push_back({name, value});
+        instance.properties.push_back({name, CimValue::of(CimType::String, value), true, ""});
+    }
+    for (const auto& [name, value] : others)
+        instance.properties.push_back({name, value, false, ""});
+    instance.path = core::CimPath(className, std::move(pathKeys));
+    return instance;
+}
+
+core::InstanceValue objectManager(const std::string& systemName) {
+    const auto textOf = [](const char* value) { return CimValue::of(CimType::String, std::string(value)); };
+    constexpr std::uint64_t kEnabled = 2;
+    constexpr std::uint64_t kOk = 2;
+    return makeInstance(kManager,
+                        {{"SystemCreationClassName", "CIM_ComputerSystem"},
+                         {"SystemName", systemName},
+                         {"CreationClassName", kManager},
+                         {"Name", kManagerName}},
+                        {{"ElementName", textOf("Quenx object manager")},
+                         {"Description", textOf("Serves firmware updates of Ethernet adapters over CIM-XML")},
+                         {"Version", textOf(QUENX_VERSION)},
+                         {"Started", CimValue::of(CimType::Boolean, true)},
+                         {"EnabledState", CimValue::of(CimType::Uint16, kEnabled)},
+                         {"OperationalStatus", CimValue::arrayOf(CimType::Uint16, {kOk})}});
+}
+
+core::InstanceValue namespaceInstance(const std::string& systemName, const std::string& name) {
+    constexpr std::uint64_t kUnknownClasses = 0;
+    return makeInstance(kNamespace,
+                        {{"SystemCreationClassName", "CIM_ComputerSystem"},
+                         {"SystemName", systemName},
+                         {"ObjectManagerCreationClassName", kManager},
+                         {"ObjectManagerName", kManagerName},
+                         {"CreationClassName", kNamespace},
+                         {"Name", name}},
+                        {{"ClassInfo", CimValue::of(CimType::Uint16, kUnknownClasses)}});
+}
+
 }  // namespace
 
-InteropModel::InteropModel(std::vector<std::string> namespaces, std::string systemName)
-    : m_namespaces(std::move(namespaces)),
-      m_systemName(std::move(systemName)),
-      m_classes(core::chainsOf(qualifiedDeclarations())) {}
-
-core::ClassChain InteropModel::findClass(const std::string& className) const {
-    const auto found = std::find_if(m_classes.begin(), m_classes.end(), [&](const core::ClassChain& chain) {
-        return core::sameName(chain.front()->name, className);
-    });
-    return found == m_classes.end() ? core::ClassChain() : *found;
-}
-
-std::vector<core::InstanceValue> InteropModel::instances(const std::string& namespaceName) const {
-    std::vector<core::InstanceValue> result{objectManager()};
-    for (const std::string& name : m_namespaces)
-        result.push_back(namespaceInstance(name));
-    for (core::InstanceValue& instance : result)
-        instance.path.setNamespace(namespaceName);
-    return result;
-}
-
-core::InstanceValue InteropModel::objectManager() const {
-    return InstanceBuilder(kManager)
-        .key("SystemCreationClassName", "CIM_ComputerSystem")
-        .key("SystemName", m_systemName)
-        .key("CreationClassName", kManager)
-        .key("Name", kManagerName)
-        .text("ElementName", "Quenx object manager")
-        .text("Description", "Serves firmware updates of Ethernet adapters over CIM-XML")
-        .text("Version", QUENX_VERSION)
-        .add("Started", CimValue::of(CimType::Boolean, true))
-        .add("EnabledState", CimValue::of(CimType::Uint16, std::uint64_t{2}))
-        .add("OperationalStatus", CimValue::arrayOf(CimType::Uint16, {std::uint64_t{2}}))
-        .build();
-}
-
-core::InstanceValue InteropModel::namespaceInstance(const std::string& name) const {
-    return InstanceBuilder(kNamespace)
-        .key("SystemCreationClassName", "CIM_ComputerSystem")
-        .key("SystemName", m_systemName)
-        .key("ObjectManagerCreationClassName", kManager)
-        .key("ObjectManagerName", kManagerName)
-        .key("CreationClassName", kNamespace)
-        .key("Name", name)
-        .add("ClassInfo", CimValue::of(CimType::Uint16, std::uint64_t{0}))
-        .build();
+InteropModel::InteropModel(const std::vector<std::string>& namespaces, const std::string& systemName)
+    : classes(core::chainsOf(declarations())), instances{objectManager(systemName)} {
+    for (const std::string& name : namespaces)
+        instances.push_back(namespaceInstance(systemName, name));
 }
 
 }  // namespace host

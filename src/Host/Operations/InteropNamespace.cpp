@@ -4,8 +4,8 @@
 #include <algorithm>
 #include <array>
 
-#include "Framework/Model/CimError.h"
 #include "Framework/Requests/DeclaredTypes.h"
+#include "Host/Operations/Operations.h"
 
 namespace host {
 
@@ -19,6 +19,8 @@ using core::InstanceValue;
 constexpr std::array<const char*, 3> kShown{"CIM_RegisteredProfile", "CIM_ReferencedProfile",
                                             "CIM_ElementConformsToProfile"};
 
+const core::PropertyFilter kNoProperties{std::vector<std::string>()};
+
 InstanceValue filtered(InstanceValue instance, const core::PropertyFilter& filter) {
     std::erase_if(instance.properties, [&](const core::PropertyValue& property) {
         return !core::isWanted(filter, property.name);
@@ -26,26 +28,37 @@ InstanceValue filtered(InstanceValue instance, const core::PropertyFilter& filte
     return instance;
 }
 
-[[noreturn]] void refuseClass(core::CimStatus status, const std::string& className,
-                              const std::string& place) {
-    throw core::CimError(status, "no class \"" + className + "\" in " + place);
-}
-
 }  // namespace
 
 InteropNamespace::InteropNamespace(std::string name, std::shared_ptr<core::CimOperations> implementation,
-                                   std::shared_ptr<const InteropModel> model)
-    : m_name(std::move(name)), m_implementation(std::move(implementation)), m_model(std::move(model)) {}
+                                   InteropModel model)
+    : m_name(std::move(name)), m_implementation(std::move(implementation)), m_model(std::move(model)) {
+    for (InstanceValue& own : m_model.instances)
+        own.path.setNamespace(m_name);
+}
+
+core::ClassChain InteropNamespace::findOwnClass(const std::string& className) const {
+    const auto found = std::find_if(
+        m_model.classes.begin(), m_model.classes.end(),
+        [&](const core::ClassChain& chain) { return core::sameName(chain.front()->name, className); });
+    return found == m_model.classes.end() ? core::ClassChain() : *found;
+}
+
+CimPath InteropNamespace::typedOwnPath(const CimPath& path) const {
+    return core::typedPath(path, [this](const std::string& name) { return findOwnClass(name); });
+}
 
 bool InteropNamespace::isShown(const core::ClassChain& chain) const {
     return std::any_of(kShown.begin(), kShown.end(), [&](const char* shown) {
         // A superclass of what is shown is shown as well: a client reads its declaration.
-        const core::ClassChain base = m_implementation->getClass(shown);
-        return core::derivesFrom(chain, shown) || core::derivesFrom(base, chain.front()->name);
+        return core::derivesFrom(chain, shown) ||
+               core::derivesFrom(m_implementation->getClass(shown), chain.front()->name);
     });
 }
 
 std::vector<std::string> InteropNamespace::sources(const std::string& className) const {
+    // Either the class itself, or, for a superclass such as CIM_ManagedElement, what is shown below it: the
+    // providers have much below it that is not shown.
     const core::ClassChain chain = m_implementation->getClass(className);
     std::vector<std::string> names;
     for (const char* shown : kShown) {
@@ -55,89 +68,71 @@ std::vector<std::string> InteropNamespace::sources(const std::string& className)
     return names;
 }
 
-core::CimPath InteropNamespace::relocated(const CimPath& path) const {
+void InteropNamespace::relocate(CimPath& path) const {
+    // A client comes back with the path, so it has to name the namespace in which its instance is served.
     std::vector<core::CimKey> keys = path.getKeys();
     for (core::CimKey& key : keys) {
-        if (auto* reference = std::get_if<CimPath>(&key.value)) *reference = relocated(*reference);
+        if (auto* reference = std::get_if<CimPath>(&key.value)) relocate(*reference);
     }
-    CimPath moved(path.getClassName(), std::move(keys));
     const core::ClassChain chain = m_implementation->getClass(path.getClassName());
-    moved.setNamespace(!chain.empty() && isShown(chain) ? m_name : m_implementation->getNamespace());
-    return moved;
+    path = CimPath(path.getClassName(), std::move(keys));
+    path.setNamespace(!chain.empty() && isShown(chain) ? m_name : m_implementation->getNamespace());
 }
 
-InstanceValue InteropNamespace::relocated(InstanceValue instance) const {
-    instance.path = relocated(instance.path);
+void InteropNamespace::relocate(InstanceValue& instance) const {
+    relocate(instance.path);
     for (core::PropertyValue& property : instance.properties) {
         auto* scalar = std::get_if<CimScalar>(&property.value.data);
         auto* reference = scalar == nullptr ? nullptr : std::get_if<CimPath>(scalar);
-        if (reference != nullptr) *reference = relocated(*reference);
+        if (reference != nullptr) relocate(*reference);
     }
-    return instance;
-}
-
-std::vector<CimPath> InteropNamespace::relocated(const std::vector<CimPath>& paths) const {
-    std::vector<CimPath> moved;
-    moved.reserve(paths.size());
-    for (const CimPath& path : paths)
-        moved.push_back(relocated(path));
-    return moved;
-}
-
-std::vector<InstanceValue> InteropNamespace::relocated(std::vector<InstanceValue> instances) const {
-    for (InstanceValue& instance : instances)
-        instance = relocated(std::move(instance));
-    return instances;
 }
 
 std::vector<InstanceValue> InteropNamespace::enumerateInstances(const std::string& className,
                                                                 const core::PropertyFilter& filter) {
-    if (getClass(className).empty()) refuseClass(core::CimStatus::InvalidClass, className, m_name);
+    requireClass(*this, className, core::CimStatus::InvalidClass);
     std::vector<InstanceValue> result;
-    for (const InstanceValue& own : m_model->instances(m_name)) {
-        if (core::derivesFrom(m_model->findClass(own.path.getClassName()), className)) {
+    for (const InstanceValue& own : m_model.instances) {
+        if (core::derivesFrom(findOwnClass(own.path.getClassName()), className))
             result.push_back(filtered(own, filter));
-        }
     }
     for (const std::string& source : sources(className)) {
-        for (InstanceValue& instance : relocated(m_implementation->enumerateInstances(source, filter))) {
+        for (InstanceValue& instance : relocated(m_implementation->enumerateInstances(source, filter)))
             result.push_back(std::move(instance));
-        }
     }
     return result;
 }
 
 std::vector<CimPath> InteropNamespace::enumerateInstanceNames(const std::string& className) {
     std::vector<CimPath> paths;
-    const core::PropertyFilter none{std::vector<std::string>()};
-    for (InstanceValue& instance : enumerateInstances(className, none)) {
+    for (InstanceValue& instance : enumerateInstances(className, kNoProperties))
         paths.push_back(std::move(instance.path));
-    }
     return paths;
 }
 
 InstanceValue InteropNamespace::getInstance(const CimPath& path, const core::PropertyFilter& filter) {
-    if (!sources(path.getClassName()).empty()) return relocated(m_implementation->getInstance(path, filter));
-    const CimPath typed =
-        core::typedPath(path, [this](const std::string& name) { return m_model->findClass(name); });
-    // The manager's own instances are few: they are made anew for each request.
-    for (InstanceValue& own : m_model->instances(m_name)) {
-        if (own.path.isSameObjectAs(typed)) return filtered(std::move(own), filter);
+    if (!sources(path.getClassName()).empty()) {
+        InstanceValue instance = m_implementation->getInstance(path, filter);
+        relocate(instance);
+        return instance;
+    }
+    const CimPath typed = typedOwnPath(path);
+    for (const InstanceValue& own : m_model.instances) {
+        if (own.path.isSameObjectAs(typed)) return filtered(own, filter);
     }
     throw core::CimError(core::CimStatus::NotFound, path.toString() + " names no instance");
 }
 
-bool InteropNamespace::hasAssociations(const CimPath& path, const core::AssociationFilter& by) {
+bool InteropNamespace::hasAssociations(const CimPath& path, const core::AssociationFilter& by) const {
     bool leads = true;
     for (const std::string& name : {by.associationClass, by.resultClass}) {
         if (name.empty() || !m_implementation->getClass(name).empty()) continue;
-        if (m_model->findClass(name).empty()) {
+        if (findOwnClass(name).empty())
             throw core::CimError(core::CimStatus::InvalidParameter, "no class \"" + name + "\"");
-        }
-        leads = false;
+        leads = false;  // the filter allows the manager's own classes alone, and those have no associations
     }
     if (!sources(path.getClassName()).empty()) return leads;
-    core::typedPath(path, [this](const std::string& name) { return m_model->findClass(name); });
+    typedOwnPath(path);
     return false;
 }
 
@@ -169,32 +164,28 @@ std::vector<CimPath> InteropNamespace::referenceNames(const CimPath& path,
 
 core::MethodResult InteropNamespace::invokeMethod(const CimPath& path, const std::string& method,
                                                   const std::vector<core::Argument>&) {
-    if (getClass(path.getClassName()).empty())
-        refuseClass(core::CimStatus::NotFound, path.getClassName(), m_name);
+    requireClass(*this, path.getClassName(), core::CimStatus::NotFound);
     throw core::CimError(core::CimStatus::MethodNotFound, path.getClassName() + " has no method " + method);
 }
 
 void InteropNamespace::deleteInstance(const CimPath& path) {
-    getInstance(path, core::PropertyFilter(std::vector<std::string>()));
+    getInstance(path, kNoProperties);
     throw core::CimError(core::CimStatus::NotSupported,
                          "instances of " + path.getClassName() + " cannot be deleted");
 }
 
 core::ClassChain InteropNamespace::getClass(const std::string& className) {
-    core::ClassChain own = m_model->findClass(className);
+    core::ClassChain own = findOwnClass(className);
     if (!own.empty()) return own;
     core::ClassChain chain = m_implementation->getClass(className);
     return chain.empty() || isShown(chain) ? chain : core::ClassChain();
 }
 
 std::vector<core::ClassChain> InteropNamespace::enumerateClasses(const std::string& className, bool deep) {
-    if (!className.empty() && getClass(className).empty())
-        refuseClass(core::CimStatus::InvalidClass, className, m_name);
-    std::vector<core::ClassChain> known = m_model->classes();
+    if (!className.empty()) requireClass(*this, className, core::CimStatus::InvalidClass);
+    std::vector<core::ClassChain> known = m_model.classes;
     for (core::ClassChain& chain : m_implementation->enumerateClasses("", true)) {
-        if (m_model->findClass(chain.front()->name).empty() && isShown(chain)) {
-            known.push_back(std::move(chain));
-        }
+        if (findOwnClass(chain.front()->name).empty() && isShown(chain)) known.push_back(std::move(chain));
     }
     std::erase_if(known,
                   [&](const core::ClassChain& chain) { return !core::isBelow(chain, className, deep); });

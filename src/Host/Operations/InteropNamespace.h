@@ -4,9 +4,17 @@
 #include <memory>
 
 #include "Framework/Requests/CimOperations.h"
-#include "Host/Operations/InteropModel.h"
 
 namespace host {
+
+/// What the object manager serves of itself: its own instance, and one for each namespace.
+struct InteropModel {
+    /// The names of all namespaces, and that of the machine.
+    InteropModel(const std::vector<std::string>& namespaces, const std::string& systemName);
+
+    std::vector<core::ClassChain> classes;       ///< superclasses included
+    std::vector<core::InstanceValue> instances;  ///< paths without a namespace
+};
 
 /// The namespace in which a client finds out what is served: the object manager, the namespaces, and the
 /// registered profiles with what conforms to them and what they refer to. The profiles come from the
@@ -15,7 +23,7 @@ namespace host {
 class InteropNamespace : public core::CimOperations {
   public:
     InteropNamespace(std::string name, std::shared_ptr<core::CimOperations> implementation,
-                     std::shared_ptr<const InteropModel> model);
+                     InteropModel model);
 
     const std::string& getNamespace() const override { return m_name; }
     std::vector<core::InstanceValue> enumerateInstances(const std::string& className,
@@ -38,21 +46,29 @@ class InteropNamespace : public core::CimOperations {
     std::vector<core::ClassChain> enumerateClasses(const std::string& className, bool deep) override;
 
   private:
+    core::ClassChain findOwnClass(const std::string& className) const;
+    core::CimPath typedOwnPath(const core::CimPath& path) const;
     /// Whether the providers' class is shown here.
     bool isShown(const core::ClassChain& chain) const;
     /// The providers' classes to enumerate for the instances of a class here.
     std::vector<std::string> sources(const std::string& className) const;
     /// Whether associations may lead from the path through the filter: none do from and to what is the
     /// manager's own. CimError when the path or the filter is wrong.
-    bool hasAssociations(const core::CimPath& path, const core::AssociationFilter& by);
-    core::CimPath relocated(const core::CimPath& path) const;
-    core::InstanceValue relocated(core::InstanceValue instance) const;
-    std::vector<core::CimPath> relocated(const std::vector<core::CimPath>& paths) const;
-    std::vector<core::InstanceValue> relocated(std::vector<core::InstanceValue> instances) const;
+    bool hasAssociations(const core::CimPath& path, const core::AssociationFilter& by) const;
+
+    void relocate(core::CimPath& path) const;
+    void relocate(core::InstanceValue& instance) const;
+    /// What the providers answer, as it stands in this namespace.
+    template <class Object>
+    std::vector<Object> relocated(std::vector<Object> objects) const {
+        for (Object& object : objects)
+            relocate(object);
+        return objects;
+    }
 
     const std::string m_name;
     const std::shared_ptr<core::CimOperations> m_implementation;
-    const std::shared_ptr<const InteropModel> m_model;
+    InteropModel m_model;
 };
 
 }  // namespace host

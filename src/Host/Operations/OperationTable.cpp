@@ -1,6 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
 #include <algorithm>
-#include <array>
 
 #include "Host/Operations/Operations.h"
 
@@ -9,118 +8,132 @@ namespace host {
 namespace {
 
 using cimxml::IntrinsicResult;
+using cimxml::ResultKind;
+using core::CimError;
+using core::CimStatus;
 using Kind = ParameterKind;
 
-constexpr ParameterSpec kClassName{"ClassName", Kind::ClassName};
-constexpr ParameterSpec kClassRequired{"ClassName", Kind::ClassName, true};
-constexpr ParameterSpec kInstanceName{"InstanceName", Kind::InstanceName, true};
-constexpr ParameterSpec kObjectName{"ObjectName", Kind::ObjectName, true};
+constexpr auto kRead = Privilege::Read;
+constexpr auto kAdminister = Privilege::Administer;
+constexpr auto kInstances = ResultKind::InstancesWithPath;
+constexpr auto kPaths = ResultKind::InstancePaths;
+
+constexpr ParameterSpec kClass{"ClassName", Kind::ClassName};
+constexpr ParameterSpec kRequiredClass{"ClassName", Kind::ClassName, true};
+constexpr ParameterSpec kInstance{"InstanceName", Kind::InstanceName, true};
+constexpr ParameterSpec kObject{"ObjectName", Kind::ObjectName, true};
 constexpr ParameterSpec kLocalOnly{"LocalOnly", Kind::Boolean};
-constexpr ParameterSpec kDeepInheritance{"DeepInheritance", Kind::Boolean};
+constexpr ParameterSpec kDeep{"DeepInheritance", Kind::Boolean};
 constexpr ParameterSpec kQualifiers{"IncludeQualifiers", Kind::Boolean};
-constexpr ParameterSpec kClassOrigin{"IncludeClassOrigin", Kind::Boolean};
-constexpr ParameterSpec kPropertyList{"PropertyList", Kind::TextList};
-constexpr ParameterSpec kAssocClass{"AssocClass", Kind::ClassName};
-constexpr ParameterSpec kResultClass{"ResultClass", Kind::ClassName};
+constexpr ParameterSpec kOrigin{"IncludeClassOrigin", Kind::Boolean};
+constexpr ParameterSpec kProperties{"PropertyList", Kind::TextList};
+constexpr ParameterSpec kAssociation{"AssocClass", Kind::ClassName};
+constexpr ParameterSpec kResult{"ResultClass", Kind::ClassName};
 constexpr ParameterSpec kRole{"Role", Kind::Text};
 constexpr ParameterSpec kResultRole{"ResultRole", Kind::Text};
-constexpr ParameterSpec kFilterLanguage{"FilterQueryLanguage", Kind::Text};
-constexpr ParameterSpec kFilter{"FilterQuery", Kind::Text};
-constexpr ParameterSpec kTimeout{"OperationTimeout", Kind::Number};
-constexpr ParameterSpec kContinue{"ContinueOnError", Kind::Boolean};
-constexpr ParameterSpec kCount{"MaxObjectCount", Kind::Number};
 constexpr ParameterSpec kContext{"EnumerationContext", Kind::Text, true};
+constexpr ParameterSpec kCount{"MaxObjectCount", Kind::Number};
 
-constexpr ParameterSpec kGetClass[] = {kClassRequired, kLocalOnly, kQualifiers, kClassOrigin, kPropertyList};
-constexpr ParameterSpec kEnumerateClasses[] = {kClassName, kDeepInheritance, kLocalOnly, kQualifiers,
-                                               kClassOrigin};
-constexpr ParameterSpec kEnumerateClassNames[] = {kClassName, kDeepInheritance};
-constexpr ParameterSpec kGetInstance[] = {kInstanceName, kLocalOnly, kQualifiers, kClassOrigin,
-                                          kPropertyList};
-constexpr ParameterSpec kEnumerateInstances[] = {kClassRequired, kLocalOnly,   kDeepInheritance,
-                                                 kQualifiers,    kClassOrigin, kPropertyList};
-constexpr ParameterSpec kEnumerateInstanceNames[] = {kClassRequired};
-constexpr ParameterSpec kDeleteInstance[] = {kInstanceName};
-constexpr ParameterSpec kCreateInstance[] = {{"NewInstance", Kind::Instance, true}};
-constexpr ParameterSpec kModifyInstance[] = {
-    {"ModifiedInstance", Kind::Instance, true}, kQualifiers, kPropertyList};
-constexpr ParameterSpec kAssociators[] = {kObjectName, kAssocClass, kResultClass, kRole,
-                                          kResultRole, kQualifiers, kClassOrigin, kPropertyList};
-constexpr ParameterSpec kAssociatorNames[] = {kObjectName, kAssocClass, kResultClass, kRole, kResultRole};
-constexpr ParameterSpec kReferences[] = {kObjectName, kResultClass, kRole,
-                                         kQualifiers, kClassOrigin, kPropertyList};
-constexpr ParameterSpec kReferenceNames[] = {kObjectName, kResultClass, kRole};
-constexpr ParameterSpec kGetQualifier[] = {{"QualifierName", Kind::Text, true}};
-constexpr ParameterSpec kExecQuery[] = {{"QueryLanguage", Kind::Text, true}, {"Query", Kind::Text, true}};
-constexpr ParameterSpec kOpenInstances[] = {kClassRequired, kDeepInheritance, kClassOrigin,
-                                            kPropertyList,  kFilterLanguage,  kFilter,
-                                            kTimeout,       kContinue,        kCount};
-constexpr ParameterSpec kOpenPaths[] = {kClassRequired, kFilterLanguage, kFilter,
-                                        kTimeout,       kContinue,       kCount};
-constexpr ParameterSpec kOpenAssociators[] = {kInstanceName, kAssocClass,  kResultClass,  kRole,
-                                              kResultRole,   kClassOrigin, kPropertyList, kFilterLanguage,
-                                              kFilter,       kTimeout,     kContinue,     kCount};
-constexpr ParameterSpec kOpenAssociatorPaths[] = {kInstanceName, kAssocClass,     kResultClass, kRole,
-                                                  kResultRole,   kFilterLanguage, kFilter,      kTimeout,
-                                                  kContinue,     kCount};
-constexpr ParameterSpec kOpenReferences[] = {kInstanceName, kResultClass,    kRole,   kClassOrigin,
-                                             kPropertyList, kFilterLanguage, kFilter, kTimeout,
-                                             kContinue,     kCount};
-constexpr ParameterSpec kOpenReferencePaths[] = {kInstanceName, kResultClass, kRole,     kFilterLanguage,
-                                                 kFilter,       kTimeout,     kContinue, kCount};
-constexpr ParameterSpec kPull[] = {kContext, kCount};
-constexpr ParameterSpec kClose[] = {kContext};
-
-IntrinsicResult refuseQuery(const OperationContext&, const Parameters& parameters) {
-    throw core::CimError(core::CimStatus::QueryLanguageNotSupported,
-                         "queries in " + parameters.text("QueryLanguage") + " are not supported");
+/// The parameters of an operation that opens an enumeration: its own, and those that all of them share.
+std::vector<ParameterSpec> opening(std::vector<ParameterSpec> own) {
+    own.insert(own.end(), {{"FilterQueryLanguage", Kind::Text},
+                           {"FilterQuery", Kind::Text},
+                           {"OperationTimeout", Kind::Number},
+                           {"ContinueOnError", Kind::Boolean},
+                           kCount});
+    return own;
 }
 
-/// Every operation that is served, with what a caller must be allowed. Handlers do not ask again. Whatever is
-/// not here, such as changing classes, qualifiers or single properties, is answered as not supported.
-constexpr std::array kOperations{
-    Operation{"GetClass", Privilege::Read, kGetClass, getClass},
-    Operation{"EnumerateClasses", Privilege::Read, kEnumerateClasses, enumerateClasses},
-    Operation{"EnumerateClassNames", Privilege::Read, kEnumerateClassNames, enumerateClassNames},
-    Operation{"GetInstance", Privilege::Read, kGetInstance, getInstance},
-    Operation{"EnumerateInstances", Privilege::Read, kEnumerateInstances, enumerateInstances},
-    Operation{"EnumerateInstanceNames", Privilege::Read, kEnumerateInstanceNames, enumerateInstanceNames},
-    Operation{"DeleteInstance", Privilege::Administer, kDeleteInstance, deleteInstance},
-    Operation{"CreateInstance", Privilege::Administer, kCreateInstance, createInstance},
-    Operation{"ModifyInstance", Privilege::Administer, kModifyInstance, modifyInstance},
-    Operation{"Associators", Privilege::Read, kAssociators, associators},
-    Operation{"AssociatorNames", Privilege::Read, kAssociatorNames, associatorNames},
-    Operation{"References", Privilege::Read, kReferences, references},
-    Operation{"ReferenceNames", Privilege::Read, kReferenceNames, referenceNames},
-    Operation{"GetQualifier", Privilege::Read, kGetQualifier, getQualifier},
-    Operation{"EnumerateQualifiers", Privilege::Read, {}, enumerateQualifiers},
-    Operation{"ExecQuery", Privilege::Read, kExecQuery, refuseQuery},
-    Operation{"OpenEnumerateInstances", Privilege::Read, kOpenInstances, openEnumeration},
-    Operation{"OpenEnumerateInstancePaths", Privilege::Read, kOpenPaths, openEnumeration},
-    Operation{"OpenAssociatorInstances", Privilege::Read, kOpenAssociators, openEnumeration},
-    Operation{"OpenAssociatorInstancePaths", Privilege::Read, kOpenAssociatorPaths, openEnumeration},
-    Operation{"OpenReferenceInstances", Privilege::Read, kOpenReferences, openEnumeration},
-    Operation{"OpenReferenceInstancePaths", Privilege::Read, kOpenReferencePaths, openEnumeration},
-    Operation{"PullInstancesWithPath", Privilege::Read, kPull, pullEnumeration},
-    Operation{"PullInstancePaths", Privilege::Read, kPull, pullEnumeration},
-    Operation{"PullInstances", Privilege::Read, kPull, pullEnumeration},
-    Operation{"CloseEnumeration", Privilege::Read, kClose, closeEnumeration},
-};
+EnumerationOwner ownerOf(const OperationContext& context, ResultKind kind) {
+    return {core::foldName(context.target.getNamespace()), context.caller.user, kind};
+}
 
-/// Methods install firmware or may do so; they are one entry, since classes come with the providers.
-constexpr Privilege kMethodPrivilege = Privilege::Administer;
+std::size_t countOf(const Parameters& parameters) {
+    return parameters.number(kCount.name).value_or(0);
+}
+
+/// Enumerates as the handler does; the objects go out in pieces, in the form of the kind.
+template <OperationHandler handler, ResultKind kind>
+IntrinsicResult open(const OperationContext& context, const Parameters& parameters) {
+    if (parameters.isGiven("FilterQueryLanguage") || parameters.isGiven("FilterQuery"))
+        throw CimError(CimStatus::FilteredEnumerationNotSupported, "enumerations are not filtered");
+    if (parameters.flag("ContinueOnError", false)) {
+        throw CimError(CimStatus::ContinuationOnErrorNotSupported,
+                       "an enumeration ends with its first error");
+    }
+    IntrinsicResult result = handler(context, parameters);
+    result.kind = kind;
+    return context.enumerations.open(ownerOf(context, kind), std::move(result), countOf(parameters),
+                                     parameters.number("OperationTimeout"));
+}
+
+template <ResultKind kind>
+IntrinsicResult pull(const OperationContext& context, const Parameters& parameters) {
+    return context.enumerations.pull(ownerOf(context, kind), parameters.text(kContext.name),
+                                     countOf(parameters));
+}
+
+IntrinsicResult close(const OperationContext& context, const Parameters& parameters) {
+    context.enumerations.close(ownerOf(context, ResultKind::Nothing), parameters.text(kContext.name));
+    return {};
+}
+
+IntrinsicResult refuseQuery(const OperationContext&, const Parameters& parameters) {
+    throw CimError(CimStatus::QueryLanguageNotSupported,
+                   "queries in " + parameters.text("QueryLanguage") + " are not supported");
+}
+
+/// Every operation that is served (DSP0200 5.4), with what a caller must be allowed; handlers do not ask
+/// again. Whatever is not here, such as changing classes, qualifiers or single properties, is not supported.
+const std::vector<Operation> kOperations{
+    {"GetClass", kRead, getClass, {kRequiredClass, kLocalOnly, kQualifiers, kOrigin, kProperties}},
+    {"EnumerateClasses", kRead, enumerateClasses, {kClass, kDeep, kLocalOnly, kQualifiers, kOrigin}},
+    {"EnumerateClassNames", kRead, enumerateClassNames, {kClass, kDeep}},
+    {"GetInstance", kRead, getInstance, {kInstance, kLocalOnly, kQualifiers, kOrigin, kProperties}},
+    {"EnumerateInstances",
+     kRead,
+     enumerateInstances,
+     {kRequiredClass, kLocalOnly, kDeep, kQualifiers, kOrigin, kProperties}},
+    {"EnumerateInstanceNames", kRead, enumerateInstanceNames, {kRequiredClass}},
+    {"DeleteInstance", kAdminister, deleteInstance, {kInstance}},
+    {"CreateInstance", kAdminister, createInstance, {{"NewInstance", Kind::Instance, true}}},
+    {"ModifyInstance",
+     kAdminister,
+     modifyInstance,
+     {{"ModifiedInstance", Kind::Instance, true}, kQualifiers, kProperties}},
+    {"Associators",
+     kRead,
+     associators,
+     {kObject, kAssociation, kResult, kRole, kResultRole, kQualifiers, kOrigin, kProperties}},
+    {"AssociatorNames", kRead, associatorNames, {kObject, kAssociation, kResult, kRole, kResultRole}},
+    {"References", kRead, references, {kObject, kResult, kRole, kQualifiers, kOrigin, kProperties}},
+    {"ReferenceNames", kRead, referenceNames, {kObject, kResult, kRole}},
+    {"GetQualifier", kRead, getQualifier, {{"QualifierName", Kind::Text, true}}},
+    {"EnumerateQualifiers", kRead, enumerateQualifiers, {}},
+    {"ExecQuery", kRead, refuseQuery, {{"QueryLanguage", Kind::Text, true}, {"Query", Kind::Text, true}}},
+    {"OpenEnumerateInstances", kRead, open<enumerateInstances, kInstances>,
+     opening({kRequiredClass, kDeep, kOrigin, kProperties})},
+    {"OpenEnumerateInstancePaths", kRead, open<enumerateInstanceNames, kPaths>, opening({kRequiredClass})},
+    {"OpenAssociatorInstances", kRead, open<associators, kInstances>,
+     opening({kInstance, kAssociation, kResult, kRole, kResultRole, kOrigin, kProperties})},
+    {"OpenAssociatorInstancePaths", kRead, open<associatorNames, kPaths>,
+     opening({kInstance, kAssociation, kResult, kRole, kResultRole})},
+    {"OpenReferenceInstances", kRead, open<references, kInstances>,
+     opening({kInstance, kResult, kRole, kOrigin, kProperties})},
+    {"OpenReferenceInstancePaths", kRead, open<referenceNames, kPaths>, opening({kInstance, kResult, kRole})},
+    {"PullInstancesWithPath", kRead, pull<kInstances>, {kContext, kCount}},
+    {"PullInstancePaths", kRead, pull<kPaths>, {kContext, kCount}},
+    // Only a query's enumeration is pulled by this one, and none can be opened.
+    {"PullInstances", kRead, pull<ResultKind::Nothing>, {kContext, kCount}},
+    {"CloseEnumeration", kRead, close, {kContext}},
+};
 
 }  // namespace
 
 const Operation* findOperation(std::string_view name) {
-    const auto* found = std::find_if(kOperations.begin(), kOperations.end(), [&](const Operation& operation) {
-        return core::sameName(operation.name, name);
-    });
-    return found == kOperations.end() ? nullptr : found;
-}
-
-Privilege methodPrivilege() {
-    return kMethodPrivilege;
+    const auto found = std::find_if(kOperations.begin(), kOperations.end(),
+                                    [&](const Operation& each) { return core::sameName(each.name, name); });
+    return found == kOperations.end() ? nullptr : &*found;
 }
 
 }  // namespace host

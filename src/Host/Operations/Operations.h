@@ -1,15 +1,15 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
-#include <span>
 #include <string>
 #include <string_view>
+#include <vector>
 
 #include "CimXml/Response.h"
 #include "Framework/Model/CimError.h"
 #include "Framework/Requests/CimOperations.h"
+#include "Host/Operations/OpenEnumerations.h"
 #include "Host/Operations/Parameters.h"
-#include "Host/Operations/PullContexts.h"
 
 namespace host {
 
@@ -27,8 +27,7 @@ struct Caller {
 struct OperationContext {
     core::CimOperations& target;  ///< the namespace that the client addressed
     const Caller& caller;
-    PullContexts& pulls;
-    std::string_view operation;  ///< the name in the table
+    OpenEnumerations& enumerations;
 };
 
 /// An intrinsic operation. Handlers throw CimError.
@@ -37,17 +36,18 @@ using OperationHandler = cimxml::IntrinsicResult (*)(const OperationContext&, co
 struct Operation {
     std::string_view name;
     Privilege privilege;
-    std::span<const ParameterSpec> parameters;
     OperationHandler handler;
+    std::vector<ParameterSpec> parameters;
 };
 
 /// The operation of that name, without regard to case; null for an unknown one.
 const Operation* findOperation(std::string_view name);
 
-/// What calling a method takes.
-Privilege methodPrivilege();
+/// What calling a method takes. Methods install firmware or may do so; there is one privilege for all, since
+/// classes come with the providers.
+inline constexpr Privilege kMethodPrivilege = Privilege::Administer;
 
-// The handlers that the operation table names, each in the file of its group.
+// The handlers that the operation table names. Those of pull operations stand beside it.
 
 // ClassOperations.cpp
 cimxml::IntrinsicResult getClass(const OperationContext& context, const Parameters& parameters);
@@ -63,25 +63,13 @@ cimxml::IntrinsicResult enumerateInstanceNames(const OperationContext& context, 
 cimxml::IntrinsicResult deleteInstance(const OperationContext& context, const Parameters& parameters);
 cimxml::IntrinsicResult createInstance(const OperationContext& context, const Parameters& parameters);
 cimxml::IntrinsicResult modifyInstance(const OperationContext& context, const Parameters& parameters);
-
-// AssociationOperations.cpp
 cimxml::IntrinsicResult associators(const OperationContext& context, const Parameters& parameters);
 cimxml::IntrinsicResult associatorNames(const OperationContext& context, const Parameters& parameters);
 cimxml::IntrinsicResult references(const OperationContext& context, const Parameters& parameters);
 cimxml::IntrinsicResult referenceNames(const OperationContext& context, const Parameters& parameters);
 
-// PullOperations.cpp
-cimxml::IntrinsicResult openEnumeration(const OperationContext& context, const Parameters& parameters);
-cimxml::IntrinsicResult pullEnumeration(const OperationContext& context, const Parameters& parameters);
-cimxml::IntrinsicResult closeEnumeration(const OperationContext& context, const Parameters& parameters);
-
-// What several groups need.
-
 /// The chain of the class; CimError with the given status when the target does not know it.
 core::ClassChain requireClass(core::CimOperations& target, const std::string& className,
                               core::CimStatus otherwise);
-
-/// Sets the origins of the properties of all instances in the result.
-void addOrigins(core::CimOperations& target, cimxml::IntrinsicResult& result);
 
 }  // namespace host

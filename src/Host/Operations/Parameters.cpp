@@ -17,6 +17,7 @@ using core::CimType;
     throw core::CimError(core::CimStatus::InvalidParameter, text);
 }
 
+/// Booleans and numbers come as texts, and whether they can be read shows here: the accessors rely on it.
 bool isOfKind(ParameterKind kind, const ParameterValue& value) {
     const auto* text = std::get_if<std::string>(&value);
     switch (kind) {
@@ -53,6 +54,7 @@ Parameters::Parameters(const cimxml::IntrinsicCall& call, std::span<const Parame
         const auto same = [&](const auto& other) { return core::sameName(other.name, parameter.name); };
         const auto known = std::find_if(allowed.begin(), allowed.end(), same);
         if (known == allowed.end()) refuse(call.operation + " has no parameter " + parameter.name);
+        // Which of two values counts would be anybody's guess.
         const auto first = std::find_if(call.parameters.begin(), call.parameters.end(), same);
         if (&*first != &parameter) refuse(parameter.name + " is given twice");
         if (!isNull(parameter.value) && !isOfKind(known->kind, parameter.value)) {
@@ -109,9 +111,8 @@ core::CimPath Parameters::path(std::string_view name) const {
     return path != nullptr ? *path : core::CimPath(className(name), {});
 }
 
-const cimxml::InstanceBody* Parameters::instance(std::string_view name) const {
-    const ParameterValue* value = find(name);
-    return value == nullptr ? nullptr : std::get_if<cimxml::InstanceBody>(value);
+const cimxml::InstanceBody& Parameters::instance(std::string_view name) const {
+    return std::get<cimxml::InstanceBody>(*find(name));
 }
 
 bool Parameters::isClassName(std::string_view name) const {

@@ -37,8 +37,8 @@ class Parameters {
     core::PropertyFilter list(std::string_view name) const;
     /// A path without keys when not given, or given as a class.
     core::CimPath path(std::string_view name) const;
-    /// What describes an instance to be made; null when not given.
-    const cimxml::InstanceBody* instance(std::string_view name) const;
+    /// What describes an instance to be made; only for a required parameter.
+    const cimxml::InstanceBody& instance(std::string_view name) const;
     bool isClassName(std::string_view name) const;
     bool isGiven(std::string_view name) const { return find(name) != nullptr; }
 

@@ -118,14 +118,10 @@ std::optional<HttpAnswer> HttpRequest::authenticate() {
     return std::nullopt;
 }
 
-std::optional<HttpAnswer> HttpRequest::refusal() {
-    std::optional<HttpAnswer> answer = checkHead(m_head, m_server.m_limits.bodyBytes);
-    return answer ? answer : authenticate();
-}
-
 MHD_Result HttpRequest::begin() {
-    // Whoever may not is told before he sends a megabyte.
-    m_refusal = refusal();
+    // A client that may not is told before it sends a megabyte.
+    m_refusal = checkHead(m_head, m_server.m_limits.bodyBytes);
+    if (!m_refusal) m_refusal = authenticate();
     m_server.m_watch->allow(m_socket, m_server.m_limits.requestTime);
     if (!m_refusal) {
         // What is announced may never come, so no more than this is set aside on trust.
@@ -147,7 +143,7 @@ void HttpRequest::take(const char* data, std::size_t size) {
 HttpAnswer HttpRequest::carryOut() {
     // From here on the time is ours: an operation may read an image of many megabytes.
     m_server.m_watch->suspend(m_socket);
-    const SlotUse worker(m_server.m_workers, m_server.m_limits.requestTime);
+    const HeldSlot worker(m_server.m_workers, m_server.m_limits.requestTime);
     if (!worker) return HttpAnswer::withHeader(503, "Retry-After", "10");
     try {
         const cimxml::Request request = cimxml::readRequest(m_body);

@@ -2,17 +2,16 @@
 #include "Host/Server/HttpServer.h"
 
 #include <microhttpd.h>
+#include <netinet/in.h>
 #include <unistd.h>
 
 #include <cstdarg>
 #include <cstdio>
 #include <stdexcept>
 
-#include "Host/Authentication/Authentication.h"
 #include "Host/Server/ConnectionWatch.h"
 #include "Host/Server/HttpRequest.h"
-#include "Host/Server/Listener.h"
-#include "Host/Server/TlsIdentity.h"
+#include "Host/Server/ServerCertificate.h"
 #include "Utils/Log.h"
 
 namespace host {
@@ -22,17 +21,25 @@ namespace {
 constexpr const char* kTlsPriorities = "NORMAL:-VERS-ALL:+VERS-TLS1.3:+VERS-TLS1.2";
 
 /// What the function below shows; old ones live as long as their server.
-std::atomic<const TlsIdentity*> currentIdentity{nullptr};
+std::atomic<const ServerCertificate*> currentCertificate{nullptr};
 
 /// GnuTLS asks for each handshake, so a certificate that was renewed is shown without a restart.
 int retrieveCertificate(gnutls_session_t, const gnutls_datum_t*, int, const gnutls_pk_algorithm_t*, int,
-                        gnutls_pcert_st** certificates, unsigned int* count, gnutls_privkey_t* key) {
-    const TlsIdentity* identity = currentIdentity.load();
-    if (identity == nullptr) return -1;  // the handshake fails, the server goes on
-    *certificates = identity->certificates();
-    *count = identity->certificateCount();
-    *key = identity->key();
+                        gnutls_pcert_st** chain, unsigned int* length, gnutls_privkey_t* key) {
+    const ServerCertificate* certificate = currentCertificate.load();
+    if (certificate == nullptr) return -1;  // the handshake fails, the server goes on
+    *chain = certificate->chain();
+    *length = certificate->length();
+    *key = certificate->key();
     return 0;
+}
+
+std::uint16_t portOf(int socket) {
+    sockaddr_storage address{};
+    socklen_t length = sizeof address;
+    ::getsockname(socket, reinterpret_cast<sockaddr*>(&address), &length);
+    // The port is at the same place in both families.
+    return ntohs(reinterpret_cast<const sockaddr_in*>(&address)->sin_port);
 }
 
 int socketOf(MHD_Connection* connection) {
@@ -98,24 +105,29 @@ HttpServer::HttpServer(const ServerLimits& limits, Dispatcher& dispatcher, Authe
       m_watch(std::make_unique<ConnectionWatch>()) {}
 
 HttpServer::~HttpServer() {
-    close();
+    if (!m_stopping.load()) stopAccepting();
+    // The library waits for its threads, and some of them may sit out the delay after a wrong password.
+    m_authentication.stop();
+    for (MHD_Daemon* daemon : m_daemons)
+        ::MHD_stop_daemon(daemon);
+    currentCertificate.store(nullptr);
 }
 
-void HttpServer::setIdentity(std::shared_ptr<const TlsIdentity> identity) {
-    currentIdentity.store(identity.get());
-    m_identities.push_back(std::move(identity));
+void HttpServer::setCertificate(std::shared_ptr<const ServerCertificate> certificate) {
+    currentCertificate.store(certificate.get());
+    m_certificates.push_back(std::move(certificate));
 }
 
-void HttpServer::listen(Listener listener, bool tls) {
+std::uint16_t HttpServer::listen(const std::string& address, std::uint16_t port, bool tls) {
     constexpr unsigned int kFlags = MHD_USE_INTERNAL_POLLING_THREAD | MHD_USE_THREAD_PER_CONNECTION |
                                     MHD_USE_POLL | MHD_USE_ITC | MHD_USE_ERROR_LOG;
-    unsigned int flags = kFlags;
-    if (tls) flags |= MHD_USE_TLS;
-    const std::uint16_t port = listener.port();
+    const unsigned int flags = tls ? kFlags | MHD_USE_TLS : kFlags;
+    const int socket = openListener(address, port);
+    const std::uint16_t actualPort = portOf(socket);
     // The logger comes first, so that complaints about the others reach it.
     std::vector<MHD_OptionItem> options{
         {MHD_OPTION_EXTERNAL_LOGGER, reinterpret_cast<intptr_t>(&logLibrary), nullptr},
-        {MHD_OPTION_LISTEN_SOCKET, listener.release(), nullptr},
+        {MHD_OPTION_LISTEN_SOCKET, socket, nullptr},
         {MHD_OPTION_NOTIFY_COMPLETED, reinterpret_cast<intptr_t>(&Callbacks::completed), this},
         {MHD_OPTION_NOTIFY_CONNECTION, reinterpret_cast<intptr_t>(&Callbacks::connection), this},
         {MHD_OPTION_CONNECTION_LIMIT, m_limits.connections, nullptr},
@@ -128,11 +140,12 @@ void HttpServer::listen(Listener listener, bool tls) {
         options.push_back({MHD_OPTION_HTTPS_PRIORITIES, 0, const_cast<char*>(kTlsPriorities)});
     }
     options.push_back({MHD_OPTION_END, 0, nullptr});
-    MHD_Daemon* daemon = ::MHD_start_daemon(flags, port, nullptr, nullptr, &Callbacks::request, this,
+    MHD_Daemon* daemon = ::MHD_start_daemon(flags, actualPort, nullptr, nullptr, &Callbacks::request, this,
                                             MHD_OPTION_ARRAY, options.data(), MHD_OPTION_END);
     if (daemon == nullptr)
         throw std::runtime_error("Cannot start the HTTP server. The system log says more.");
     m_daemons.push_back(daemon);
+    return actualPort;
 }
 
 void HttpServer::stopAccepting() {
@@ -142,17 +155,6 @@ void HttpServer::stopAccepting() {
         if (socket >= 0) ::close(socket);  // from now on a client is refused at once, not left waiting
     }
     m_watch->endIdle();
-}
-
-void HttpServer::close() {
-    if (!m_stopping.load()) stopAccepting();
-    // The library waits for its threads, and some of them may sit out the delay after a wrong password.
-    m_authentication.stop();
-    for (MHD_Daemon* daemon : m_daemons)
-        ::MHD_stop_daemon(daemon);
-    m_daemons.clear();
-    m_watch.reset();
-    currentIdentity.store(nullptr);
 }
 
 }  // namespace host

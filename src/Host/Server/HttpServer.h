@@ -2,12 +2,14 @@
 #pragma once
 
 #include <atomic>
+#include <cstdint>
 #include <memory>
+#include <stdexcept>
 #include <string>
 #include <vector>
 
+#include "Host/Authentication/Authentication.h"
 #include "Host/Settings.h"
-#include "Host/Slots.h"
 
 struct MHD_Connection;
 struct MHD_Daemon;
@@ -15,12 +17,26 @@ struct MHD_Response;
 
 namespace host {
 
-class Authentication;
 class ConnectionWatch;
 class Dispatcher;
 class HttpRequest;
-class Listener;
-class TlsIdentity;
+class ServerCertificate;
+
+/// An address and port that cannot be listened on. what() tells a person why, and what to do.
+class ListenError : public std::runtime_error {
+  public:
+    ListenError(const std::string& text, int code) : std::runtime_error(text), m_code(code) {}
+
+    /// The system's error number; EINVAL for a text that is not an address.
+    int code() const { return m_code; }
+
+  private:
+    int m_code;
+};
+
+/// A listening TCP socket, close-on-exec, which the caller owns. Port 0 takes any free one. Throws
+/// ListenError.
+int openListener(const std::string& address, std::uint16_t port);
 
 /// Serves CIM-XML over HTTP and HTTPS. One thread per connection, and a bounded number of them: a request may
 /// verify an image or ask PAM, and would stall every client of a thread that serves many. One per process,
@@ -33,10 +49,11 @@ class HttpServer {
     HttpServer(const HttpServer&) = delete;
     HttpServer& operator=(const HttpServer&) = delete;
 
-    /// Throws std::runtime_error. TLS needs an identity first.
-    void listen(Listener listener, bool tls);
+    /// Returns the port, also where 0 asked for any. Throws std::runtime_error. TLS needs a certificate
+    /// first.
+    std::uint16_t listen(const std::string& address, std::uint16_t port, bool tls);
     /// What connections from now on are shown.
-    void setIdentity(std::shared_ptr<const TlsIdentity> identity);
+    void setCertificate(std::shared_ptr<const ServerCertificate> certificate);
 
     /// Takes no more connections, ends those that are idle, and has the others end after their answer.
     void stopAccepting();
@@ -47,15 +64,14 @@ class HttpServer {
     friend class HttpRequest;
     struct Callbacks;
 
-    void close();
-
     const ServerLimits m_limits;
     Dispatcher& m_dispatcher;
     Authentication& m_authentication;
     Slots m_workers;
     std::atomic<unsigned int> m_inFlight{0};
     std::atomic<bool> m_stopping{false};
-    std::vector<std::shared_ptr<const TlsIdentity>> m_identities;  ///< a handshake may still use an old one
+    std::vector<std::shared_ptr<const ServerCertificate>>
+        m_certificates;  ///< a handshake may still use an old one
     std::unique_ptr<ConnectionWatch> m_watch;
     std::vector<MHD_Daemon*> m_daemons;
 };

@@ -1,6 +1,4 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "Host/Server/Listener.h"
-
 #include <arpa/inet.h>
 #include <netinet/in.h>
 #include <sys/socket.h>
@@ -8,8 +6,8 @@
 
 #include <cerrno>
 #include <cstring>
-#include <stdexcept>
-#include <utility>
+
+#include "Host/Server/HttpServer.h"
 
 namespace host {
 
@@ -33,52 +31,44 @@ SocketAddress addressOf(const std::string& text, std::uint16_t port) {
         six->sin6_port = htons(port);
         address.length = sizeof *six;
     } else {
-        throw std::runtime_error(
+        throw ListenError(
             "listen.address is \"" + text +
-            "\". It must be an IPv4 or IPv6 address such as 127.0.0.1, or 0.0.0.0 or :: for all.");
+                "\". It must be an IPv4 or IPv6 address such as 127.0.0.1, or 0.0.0.0 or :: for all.",
+            EINVAL);
     }
     return address;
 }
 
-std::uint16_t portOf(int socket) {
-    SocketAddress address;
-    address.length = sizeof address.storage;
-    ::getsockname(socket, reinterpret_cast<sockaddr*>(&address.storage), &address.length);
-    // The port is at the same place in both families.
-    return ntohs(reinterpret_cast<const sockaddr_in*>(&address.storage)->sin_port);
+const char* adviceFor(int error) {
+    switch (error) {
+        case EADDRINUSE:
+            return "Stop the program that listens there, or set listen.https_port or listen.http_port.";
+        case EACCES:
+            return "Ports below 1024 need root or CAP_NET_BIND_SERVICE. Set another port, or run with one.";
+        case EADDRNOTAVAIL:
+            return "Set listen.address to an address of this machine, or to 0.0.0.0 or :: for all.";
+        default:
+            return "Check listen.address and the ports.";
+    }
 }
 
 }  // namespace
 
-void Listener::checkAddress(const std::string& address) {
-    addressOf(address, 0);
-}
-
-Listener::Listener(const std::string& address, std::uint16_t port) {
+int openListener(const std::string& address, std::uint16_t port) {
     const SocketAddress place = addressOf(address, port);
-    m_socket = ::socket(place.storage.ss_family, SOCK_STREAM | SOCK_CLOEXEC | SOCK_NONBLOCK, 0);
+    const int socket = ::socket(place.storage.ss_family, SOCK_STREAM | SOCK_CLOEXEC | SOCK_NONBLOCK, 0);
     const int yes = 1;
-    if (m_socket >= 0) ::setsockopt(m_socket, SOL_SOCKET, SO_REUSEADDR, &yes, sizeof yes);
-    if (m_socket < 0 ||
-        ::bind(m_socket, reinterpret_cast<const sockaddr*>(&place.storage), place.length) != 0 ||
-        ::listen(m_socket, SOMAXCONN) != 0) {
+    // Without it a restart would fail as long as connections of the last run are in the state TIME_WAIT.
+    if (socket >= 0) ::setsockopt(socket, SOL_SOCKET, SO_REUSEADDR, &yes, sizeof yes);
+    if (socket < 0 || ::bind(socket, reinterpret_cast<const sockaddr*>(&place.storage), place.length) != 0 ||
+        ::listen(socket, SOMAXCONN) != 0) {
         const int error = errno;
-        if (m_socket >= 0) ::close(m_socket);
-        throw std::runtime_error("Cannot listen on " + address + " port " + std::to_string(port) + ": " +
-                                 std::strerror(error) + ". Check listen.address and the ports.");
+        if (socket >= 0) ::close(socket);
+        throw ListenError("Cannot listen on " + address + " port " + std::to_string(port) + ": " +
+                              std::strerror(error) + ". " + adviceFor(error),
+                          error);
     }
-    m_port = portOf(m_socket);
-}
-
-Listener::Listener(Listener&& other) noexcept
-    : m_socket(std::exchange(other.m_socket, -1)), m_port(other.m_port) {}
-
-Listener::~Listener() {
-    if (m_socket >= 0) ::close(m_socket);
-}
-
-int Listener::release() {
-    return std::exchange(m_socket, -1);
+    return socket;
 }
 
 }  // namespace host

@@ -1,0 +1,93 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include <optional>
+#include <pugixml.hpp>
+#include <string>
+#include <string_view>
+
+#include "CimXml/Xml.h"
+#include "Framework/Model/ClassDeclaration.h"
+#include "Framework/Requests/RequestValues.h"
+
+namespace cimxml {
+
+// The elements that requests and responses have in common: paths, values, classes.
+
+// Reading. WireError (not valid) for an element that is none of those named, or holds something else.
+
+/// How the keys of paths are read.
+enum class KeyTyping {
+    Text,         ///< as texts: a server knows the declared types and goes by them alone
+    ByAttributes  ///< by TYPE or else VALUETYPE: a client has nothing better
+};
+
+/// An object as a message names it. A class has no keys; an instance may lack them too, which only isClass
+/// tells apart.
+struct ObjectName {
+    core::CimPath path;
+    bool isClass = false;
+};
+
+/// LOCALNAMESPACEPATH: the names joined by slashes.
+std::string readNamespace(const pugi::xml_node& element);
+
+/// Any of INSTANCENAME, LOCALINSTANCEPATH, INSTANCEPATH, CLASSNAME, LOCALCLASSPATH, CLASSPATH. A single
+/// unnamed key gets the empty name.
+ObjectName readObject(const pugi::xml_node& element, KeyTyping typing);
+
+/// VALUE.REFERENCE.
+core::CimPath readReference(const pugi::xml_node& element, KeyTyping typing);
+
+/// The type that the attribute names; nothing when the element lacks the attribute.
+std::optional<core::CimType> readType(const pugi::xml_node& element, const char* attribute);
+
+/// The value inside PARAMVALUE, QUALIFIER or a property element: none (null), VALUE, VALUE.ARRAY,
+/// VALUE.REFERENCE, VALUE.REFARRAY, or a bare object name where a reference is meant. What the caller does
+/// not know, the type or whether it is an array, the element inside decides; its texts are then strings.
+/// Nothing for a value that is not of the type, or an array that holds a null.
+std::optional<core::CimValue> readValue(const pugi::xml_node& element, std::optional<core::CimType> type,
+                                        std::optional<bool> isArray, KeyTyping typing);
+
+/// CLASS, as a client reads it: what is a key, an output and an association is taken from the qualifiers.
+core::ClassDeclaration readClass(const pugi::xml_node& element);
+
+/// The type of what is held, the widest of its kind.
+core::CimType typeOfScalar(const core::CimScalar& value);
+
+// Writing.
+
+/// LOCALNAMESPACEPATH of the namespace's parts.
+void writeNamespace(XmlWriter& writer, std::string_view namespaceName);
+
+/// CLASSNAME.
+void writeClassName(XmlWriter& writer, std::string_view name);
+
+/// INSTANCENAME, with references among the keys as LOCALINSTANCEPATH.
+void writeInstanceName(XmlWriter& writer, const core::CimPath& path);
+
+/// LOCALINSTANCEPATH or LOCALCLASSPATH, whichever the path is.
+void writeLocalPath(XmlWriter& writer, const core::CimPath& path);
+
+/// INSTANCEPATH; the host stands in for one that the path does not have.
+void writeInstancePath(XmlWriter& writer, const core::CimPath& path, std::string_view host);
+
+/// VALUE, VALUE.ARRAY, VALUE.REFERENCE or VALUE.REFARRAY; nothing for null.
+void writeValue(XmlWriter& writer, const core::CimValue& value);
+
+/// VALUE with a text.
+void writeText(XmlWriter& writer, std::string_view text);
+
+/// PARAMVALUE, with its type unless the argument has none of its own.
+void writeArgument(XmlWriter& writer, const core::Argument& argument);
+
+/// The element of a property of that type: PROPERTY, PROPERTY.ARRAY or PROPERTY.REFERENCE.
+std::string_view propertyElement(core::CimType type, bool isArray);
+
+/// CLASS. The flavors of its qualifiers are those of their declarations.
+void writeClass(XmlWriter& writer, const core::ClassDeclaration& declaration);
+
+/// QUALIFIER.DECLARATION.
+void writeQualifierDeclaration(XmlWriter& writer, const core::QualifierDeclaration& declaration);
+
+}  // namespace cimxml

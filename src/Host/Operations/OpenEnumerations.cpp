@@ -1,0 +1,133 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "Host/Operations/OpenEnumerations.h"
+
+#include <sys/random.h>
+
+#include <algorithm>
+#include <array>
+
+#include "Framework/Model/CimError.h"
+#include "Utils/Utils.h"
+
+namespace host {
+
+namespace {
+
+using cimxml::IntrinsicResult;
+using core::CimError;
+using core::CimStatus;
+using core::CimType;
+using core::CimValue;
+
+/// A name that nobody can guess: whoever knows it and the user can read what is left.
+std::string newContext() {
+    std::array<unsigned char, 16> bytes{};
+    if (::getrandom(bytes.data(), bytes.size(), 0) != static_cast<ssize_t>(bytes.size())) {
+        throw CimError(CimStatus::Failed, "no random numbers for an enumeration context");
+    }
+    std::string text;
+    for (const unsigned char byte : bytes)
+        text += utils::hexByte(byte);
+    return text;
+}
+
+template <class T>
+void takeLast(std::vector<T>& from, std::vector<T>& to, std::size_t count) {
+    for (std::size_t i = std::min(count, from.size()); i > 0; --i) {
+        to.push_back(std::move(from.back()));
+        from.pop_back();
+    }
+}
+
+/// The next objects of what is left; the outputs are still missing.
+IntrinsicResult takeNext(IntrinsicResult& rest, std::size_t count) {
+    IntrinsicResult part;
+    part.kind = rest.kind;
+    part.origins = rest.origins;
+    takeLast(rest.instances, part.instances, count);
+    takeLast(rest.paths, part.paths, count);
+    return part;
+}
+
+bool isEmpty(const IntrinsicResult& rest) {
+    return rest.instances.empty() && rest.paths.empty();
+}
+
+void addOutputs(IntrinsicResult& part, bool ended, const std::string& context) {
+    part.outputs.push_back({"EndOfSequence", CimValue::of(CimType::Boolean, ended)});
+    part.outputs.push_back({"EnumerationContext", CimValue::of(CimType::String, context)});
+}
+
+}  // namespace
+
+std::chrono::seconds OpenEnumerations::checkedTimeout(std::optional<std::uint32_t> seconds) const {
+    if (!seconds) return m_limits.timeout;
+    const std::chrono::seconds wanted(*seconds);
+    if (wanted.count() == 0 || wanted > m_limits.maxTimeout) {
+        throw CimError(CimStatus::InvalidOperationTimeout,
+                       "OperationTimeout must be from 1 to " + std::to_string(m_limits.maxTimeout.count()));
+    }
+    return wanted;
+}
+
+void OpenEnumerations::dropExpired() {
+    std::erase_if(m_entries, [now = Clock::now()](const auto& each) { return each.second.expires <= now; });
+}
+
+OpenEnumerations::Entries::iterator OpenEnumerations::find(const EnumerationOwner& owner,
+                                                           const std::string& context, bool anyKind) {
+    dropExpired();
+    const auto found = m_entries.find(context);
+    // Somebody else's context is answered as an unknown one, which tells nothing.
+    if (found != m_entries.end()) {
+        EnumerationOwner wanted = owner;
+        if (anyKind) wanted.kind = found->second.owner.kind;
+        if (found->second.owner == wanted) return found;
+    }
+    throw CimError(CimStatus::InvalidEnumerationContext, "no enumeration of that context is open");
+}
+
+IntrinsicResult OpenEnumerations::open(const EnumerationOwner& owner, IntrinsicResult result,
+                                       std::size_t count, std::optional<std::uint32_t> timeoutSeconds) {
+    const std::chrono::seconds timeout = checkedTimeout(timeoutSeconds);
+    // Taken from the end, so that each pull costs what it delivers and frees it.
+    std::reverse(result.instances.begin(), result.instances.end());
+    std::reverse(result.paths.begin(), result.paths.end());
+    IntrinsicResult part = takeNext(result, count);
+    if (isEmpty(result)) {
+        addOutputs(part, true, "");
+        return part;
+    }
+    // A result that fits into the first answer is never kept, and counts against no limit.
+    const std::string context = newContext();
+    const utils::Mutex::AutoLocker lock(m_mutex);
+    dropExpired();
+    if (m_entries.size() >= m_limits.open) {
+        throw CimError(CimStatus::ServerLimitsExceeded, "too many enumerations are open");
+    }
+    m_entries[context] = {owner, std::move(result), timeout, Clock::now() + timeout};
+    addOutputs(part, false, context);
+    return part;
+}
+
+IntrinsicResult OpenEnumerations::pull(const EnumerationOwner& owner, const std::string& context,
+                                       std::size_t count) {
+    const utils::Mutex::AutoLocker lock(m_mutex);
+    const auto found = find(owner, context, false);
+    IntrinsicResult part = takeNext(found->second.rest, count);
+    const bool ended = isEmpty(found->second.rest);
+    addOutputs(part, ended, ended ? "" : context);
+    if (ended) {
+        m_entries.erase(found);
+    } else {
+        found->second.expires = Clock::now() + found->second.timeout;
+    }
+    return part;
+}
+
+void OpenEnumerations::close(const EnumerationOwner& owner, const std::string& context) {
+    const utils::Mutex::AutoLocker lock(m_mutex);
+    m_entries.erase(find(owner, context, true));
+}
+
+}  // namespace host

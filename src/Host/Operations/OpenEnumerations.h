@@ -1,0 +1,63 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include <chrono>
+#include <map>
+#include <string>
+
+#include "CimXml/Response.h"
+#include "Host/Settings.h"
+#include "Utils/Os/Linux/Thread.h"
+#include "Utils/ThreadAnnotations.h"
+
+namespace host {
+
+/// Who may pull on an enumeration, and how.
+struct EnumerationOwner {
+    std::string namespaceName;  ///< folded
+    std::string user;
+    cimxml::ResultKind kind = cimxml::ResultKind::Nothing;
+
+    bool operator==(const EnumerationOwner&) const = default;
+};
+
+/// The enumerations that clients have opened and not yet read to the end. They hold values, so that an
+/// instance that goes meanwhile is no concern. Thread-safe. All errors are CimError.
+class OpenEnumerations {
+  public:
+    using Clock = std::chrono::steady_clock;
+
+    explicit OpenEnumerations(const PullLimits& limits) : m_limits(limits) {}
+
+    /// The first `count` objects of the result, with the outputs EndOfSequence and EnumerationContext. What
+    /// is left is kept. Server limits exceeded when too many are open, invalid operation timeout for one out
+    /// of range.
+    cimxml::IntrinsicResult open(const EnumerationOwner& owner, cimxml::IntrinsicResult result,
+                                 std::size_t count, std::optional<std::uint32_t> timeoutSeconds);
+    /// The next ones. Invalid enumeration context for one that is unknown, ended, timed out, or somebody
+    /// else's.
+    cimxml::IntrinsicResult pull(const EnumerationOwner& owner, const std::string& context,
+                                 std::size_t count);
+    /// Lets go of an enumeration, of whichever kind.
+    void close(const EnumerationOwner& owner, const std::string& context);
+
+  private:
+    struct Entry {
+        EnumerationOwner owner;
+        cimxml::IntrinsicResult rest;  ///< in the reverse order, so that the next ones are at the end
+        std::chrono::seconds timeout{0};
+        Clock::time_point expires;
+    };
+    using Entries = std::map<std::string, Entry>;
+
+    std::chrono::seconds checkedTimeout(std::optional<std::uint32_t> seconds) const;
+    void dropExpired() QUENX_REQUIRES(m_mutex);
+    Entries::iterator find(const EnumerationOwner& owner, const std::string& context, bool anyKind)
+        QUENX_REQUIRES(m_mutex);
+
+    const PullLimits m_limits;
+    utils::Mutex m_mutex;
+    Entries m_entries QUENX_GUARDED_BY(m_mutex);
+};
+
+}  // namespace host

@@ -1,0 +1,180 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "CimXml/Request.h"
+
+#include <gtest/gtest.h>
+
+#include "CimXml/WireCheck.h"
+#include "CimXml/WireError.h"
+
+namespace {
+
+using cimxml::Request;
+
+template <class T>
+T held(const Request& request, std::string_view name) {
+    for (const cimxml::Parameter& each : std::get<cimxml::IntrinsicCall>(request.call).parameters) {
+        if (each.name == name) return std::get<T>(each.value);
+    }
+    ADD_FAILURE() << name;
+    return T{};
+}
+
+TEST(RequestReaderTest, ReadsWhatClientsSend) {
+    for (const std::string& name : test::sampleNames()) {
+        const std::string sample = test::readSample(name);
+        const Request request = cimxml::readRequest(sample);
+        EXPECT_EQ(request.messageId, name.starts_with("w-") ? "4711" : "1001");
+        EXPECT_EQ(name.substr(2), request.name() + ".xml");
+        for (std::size_t length = 0; length < sample.find("</CIM>") + 6; ++length)
+            EXPECT_THROW(cimxml::readRequest(sample.substr(0, length)), cimxml::WireError) << length;
+        if (name == "w-CreateInstance.xml") continue;  // of the instance only its name is kept
+        const std::string written = cimxml::writeRequest(request);
+        EXPECT_EQ(cimxml::writeRequest(cimxml::readRequest(written)), written) << name;
+    }
+    const Request get = cimxml::readRequest(test::readSample("w-GetInstance.xml"));
+    EXPECT_EQ(std::get<cimxml::IntrinsicCall>(get.call).namespaceName, "root/cimv2");
+    EXPECT_EQ(held<std::string>(get, "LocalOnly"), "FALSE");
+    EXPECT_EQ(held<core::CimPath>(get, "InstanceName").toString(),
+              "root/cimv2:Quenx_ConcreteJob.InstanceID=\"Quenx:FirmwareUpdate@Job#1\"");
+    const Request walk = cimxml::readRequest(test::readSample("p-Associators.xml"));
+    EXPECT_EQ(held<cimxml::ClassName>(walk, "AssocClass").name, "CIM_ElementCapabilities");
+    EXPECT_EQ(held<std::vector<std::string>>(walk, "PropertyList"), std::vector<std::string>{"Name"});
+    const Request open = cimxml::readRequest(test::readSample("p-OpenEnumerateInstances.xml"));
+    held<std::monostate>(open, "FilterQuery");
+}
+
+/// The call inside an envelope that is right.
+std::string wrapped(const std::string& call) {
+    return "<CIM CIMVERSION=\"2.3\" DTDVERSION=\"2.1\"><MESSAGE ID=\"1\" "
+           "PROTOCOLVERSION=\"1.1\"><SIMPLEREQ>" +
+           call + "</SIMPLEREQ></MESSAGE></CIM>";
+}
+
+std::string parameterWith(const std::string& value) {
+    return wrapped(
+        "<IMETHODCALL NAME=\"X\"><LOCALNAMESPACEPATH><NAMESPACE NAME=\"root\"/></LOCALNAMESPACEPATH>"
+        "<IPARAMVALUE NAME=\"P\">" +
+        value + "</IPARAMVALUE></IMETHODCALL>");
+}
+
+TEST(RequestReaderTest, KeepsTextsAsTheyAre) {
+    for (const auto& [text, expected] : std::initializer_list<std::pair<const char*, const char*>>{
+             {"<VALUE>  two  </VALUE>", "  two  "},
+             {"<VALUE> </VALUE>", " "},
+             {"<VALUE/>", ""},
+             {"<VALUE>&lt;a&#x20AC;<![CDATA[<&>]]>&amp;</VALUE>", "<a\xE2\x82\xAC<&>&"},
+             {"\n <VALUE>a<!-- c -->b</VALUE>\n", "ab"}}) {
+        EXPECT_EQ(held<std::string>(cimxml::readRequest(parameterWith(text)), "P"), expected);
+    }
+}
+
+TEST(RequestReaderTest, RefusesEachFaultByItsName) {
+    const std::string good = test::readSample("w-GetInstance.xml");
+    const auto changed = [&](const std::string& from, const std::string& to) {
+        std::string text = good;
+        EXPECT_NE(text.find(from), std::string::npos) << from;
+        return text.replace(text.find(from), from.size(), to);
+    };
+    const std::string place = "<LOCALNAMESPACEPATH><NAMESPACE NAME='root'/></LOCALNAMESPACEPATH>";
+    const std::pair<const char*, std::vector<std::string>> table[] = {
+        {"unsupported-cim-version", {changed("CIMVERSION=\"2.0\"", "CIMVERSION=\"3.0\"")}},
+        {"unsupported-dtd-version", {changed("DTDVERSION=\"2.0\"", "DTDVERSION=\"1.0\"")}},
+        {"unsupported-protocol-version", {changed("PROTOCOLVERSION=\"1.0\"", "PROTOCOLVERSION=\"2.0\"")}},
+        {"request-not-well-formed", {changed("</IMETHODCALL>", "")}},
+        {"multiple-requests-unsupported",
+         {"<CIM CIMVERSION='2.0' DTDVERSION='2.0'><MESSAGE ID='1' "
+          "PROTOCOLVERSION='1.0'><MULTIREQ/></MESSAGE></CIM>"}},
+        {"request-not-valid",
+         {"<CIM/>", changed("PROTOCOLVERSION=\"1.0\"", ""), changed("ID=\"4711\"", ""),
+          changed("NAME=\"GetInstance\"", ""), changed("<SIMPLEREQ>", "<SIMPLEREQ>text"), wrapped(""),
+          wrapped("<OTHERCALL/>"), wrapped("<IMETHODCALL NAME='X'/>"),
+          wrapped("<IMETHODCALL NAME='X'><LOCALNAMESPACEPATH/></IMETHODCALL>"),
+          wrapped("<METHODCALL NAME='X'>" + place + "</METHODCALL>"), parameterWith("<VALUE/><VALUE/>"),
+          parameterWith("<VALUE><B/></VALUE>"), parameterWith("<UNKNOWN/>"),
+          parameterWith("<VALUE.ARRAY><CLASSNAME NAME='x'/></VALUE.ARRAY>"),
+          parameterWith("<INSTANCENAME CLASSNAME='C'><KEYVALUE>1</KEYVALUE>"
+                        "<KEYVALUE>2</KEYVALUE></INSTANCENAME>")}},
+    };
+    for (const auto& [fault, messages] : table) {
+        for (const std::string& message : messages) {
+            try {
+                cimxml::readRequest(message);
+                ADD_FAILURE() << "accepted: " << message;
+            } catch (const cimxml::WireError& error) {
+                EXPECT_STREQ(error.fault().cimError, fault) << message;
+            }
+        }
+    }
+}
+
+TEST(RequestReaderTest, NotesAnArgumentThatIsNotOfItsStatedType) {
+    const auto mistyped = [](const std::string& argument) {
+        const Request request = cimxml::readRequest(
+            wrapped("<METHODCALL NAME='X'><LOCALCLASSPATH><LOCALNAMESPACEPATH><NAMESPACE NAME='root'/>"
+                    "</LOCALNAMESPACEPATH><CLASSNAME NAME='C'/></LOCALCLASSPATH><PARAMVALUE NAME='P' " +
+                    argument + "</PARAMVALUE></METHODCALL>"));
+        return std::get<cimxml::MethodCall>(request.call).mistypedArgument;
+    };
+    const std::string reference = "<VALUE.REFERENCE><CLASSNAME NAME='C'/></VALUE.REFERENCE>";
+    for (const std::string& good :
+         {std::string(">"), std::string("><VALUE>x</VALUE>"), ">" + reference,
+          "PARAMTYPE='reference'>" + reference,
+          std::string("PARAMTYPE='uint8'><VALUE.ARRAY><VALUE>5</VALUE></VALUE.ARRAY>")})
+        EXPECT_EQ(mistyped(good), "") << good;
+    for (const std::string& bad :
+         {std::string("PARAMTYPE='uint8'><VALUE>256</VALUE>"), "PARAMTYPE='string'>" + reference,
+          std::string("PARAMTYPE='reference'><VALUE>C</VALUE>"),
+          std::string("><VALUE.ARRAY><VALUE>x</VALUE><VALUE.NULL/></VALUE.ARRAY>")})
+        EXPECT_EQ(mistyped(bad), "P") << bad;
+}
+
+bool areAccepted(const cimxml::RequestHeaders& headers, const Request& request) {
+    try {
+        cimxml::checkHeadersAgainst(headers, request);
+        return true;
+    } catch (const cimxml::WireError& error) {
+        EXPECT_STREQ(error.fault().cimError, "header-mismatch");
+        return false;
+    }
+}
+
+cimxml::RequestHeaders withObject(const char* object) {
+    cimxml::RequestHeaders headers;
+    headers.object = object;
+    return headers;
+}
+
+TEST(RequestHeadersTest, HaveToNameTheNamespaceOfAnOperation) {
+    const Request request{"1", cimxml::IntrinsicCall{"GetInstance", "root/cimv2", {}}};
+    for (const char* same :
+         {"root/cimv2", "root%2fcimv2", "Root%2FCIMv2", "/root/cimv2/", "//host:1/root/cimv2"})
+        EXPECT_TRUE(areAccepted(withObject(same), request)) << same;
+    for (const char* other : {"", "root", "root/cimv2/x", "root/cimv2:CIM_Service", "interop", "%"})
+        EXPECT_FALSE(areAccepted(withObject(other), request)) << other;
+}
+
+TEST(RequestHeadersTest, HaveToNameTheObjectOfAMethod) {
+    core::CimPath object("C_Job", {{"ID", std::string("a\"b\\c")}, {"Number", std::string("0x5")}});
+    object.setNamespace("root/cimv2");
+    const Request request{"1", cimxml::MethodCall{"Kill", object, {}}};
+    for (const char* same :
+         {"root/cimv2:C_Job.ID=\"a\\\"b\\\\c\",Number=5", "//h/root/cimv2:c_job.number=5,id=\"a\\\"b\\\\c\"",
+          "root%2Fcimv2%3AC_Job.ID=%22a%5C%22b%5C%5Cc%22,Number=5",
+          "root/cimv2:C_Job.ID=\"a\"b\\c\",Number=0x5"}) {  // a client that escapes nothing
+        EXPECT_TRUE(areAccepted(withObject(same), request)) << same;
+    }
+    for (const char* other :
+         {"", "root/cimv2", "root/cimv2:C_Job", "root/interop:C_Job.ID=\"a\\\"b\\\\c\",Number=5",
+          "root/cimv2:C_Other.ID=\"a\\\"b\\\\c\",Number=5", "root/cimv2:C_Job.ID=\"x\",Number=5",
+          "root/cimv2:C_Job.ID=\"a\\\"b\\\\c\",Number=6", "root/cimv2:C_Job.ID=\"a\\\"b\\\\c\"",
+          "root/cimv2:C_Other.ID=\"a\"b\""}) {
+        EXPECT_FALSE(areAccepted(withObject(other), request)) << other;
+    }
+    cimxml::RequestHeaders method;
+    method.method = "K%69LL";
+    EXPECT_TRUE(areAccepted(method, request));
+    method.method = "Start";
+    EXPECT_FALSE(areAccepted(method, request));
+}
+
+}  // namespace

@@ -1,0 +1,108 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "CimXml/Xml.h"
+
+#include <gtest/gtest.h>
+
+#include <random>
+#include <string>
+
+#include "CimXml/WireError.h"
+
+namespace {
+
+using namespace std::string_literals;
+
+bool isAccepted(const std::string& document, const cimxml::XmlLimits& limits = {}) {
+    try {
+        cimxml::checkWellFormed(document, limits);
+        return true;
+    } catch (const cimxml::WireError& error) {
+        EXPECT_STREQ(error.fault().cimError, "request-not-well-formed");
+        return false;
+    }
+}
+
+TEST(XmlGuardTest, AcceptsWellFormedDocuments) {
+    EXPECT_TRUE(isAccepted("\xEF\xBB\xBF<?xml version='1.0' encoding=\"UTF-8\" standalone='yes'?>\n<a/>"));
+    EXPECT_TRUE(isAccepted("<a b='1' c=\"&lt;'\"><d >x &amp; &#x41; &#x10FFFF; ]] ></d ><![CDATA[<&]]></a>"));
+    EXPECT_TRUE(isAccepted("<a>gr\xC3\xBC\xE2\x82\xAC\xF0\x9F\x98\x80\t\r\n</a>\n<!-- end --><?p x?>"));
+}
+
+TEST(XmlGuardTest, RefusesWhatIsNotWellFormed) {
+    const std::string markup[] = {"",
+                                  "<a>",
+                                  "<a></b>",
+                                  "<a/><b/>",
+                                  "text<a/>",
+                                  "<a b=1/>",
+                                  "<a b='1' b='2'/>",
+                                  "<a b='<'/>",
+                                  "<a b='1/>",
+                                  "<1a/>",
+                                  "<a>&</a>",
+                                  "<a>&unknown;</a>",
+                                  "<a>&amp</a>",
+                                  "<a>&#0;</a>",
+                                  "<a>&#;</a>",
+                                  "<a>&#-65;</a>",
+                                  "<a>&#xD800;</a>",
+                                  "<a>&#x110000;</a>",
+                                  "<a b='&no;'/>",
+                                  "<a>]]></a>",
+                                  "<a><!-- -- --></a>",
+                                  "<a><!-- </a>",
+                                  "<![CDATA[x]]><a/>",
+                                  " <?xml version='1.0'?><a/>",
+                                  "<?xml version='1.0' encoding='utf-16'?><a/>",
+                                  "<!DOCTYPE a><a/>",
+                                  "<!DOCTYPE a [<!ENTITY x 'y'>]><a>&x;</a>",
+                                  "<a><!ELEMENT b></a>"};
+    for (const std::string& bad : markup)
+        EXPECT_FALSE(isAccepted(bad)) << bad;
+    // NUL, control, bare continuation, overlong, surrogate, beyond the last plane, cut short, FFFE.
+    const std::string texts[] = {
+        "\0"s,      "\x01",        "\x80", "\xC0\x80", "\xE0\x80\xAF", "\xED\xA0\x80", "\xF4\x90\x80\x80",
+        "\xE2\x82", "\xEF\xBF\xBE"};
+    for (const std::string& bad : texts)
+        EXPECT_FALSE(isAccepted("<a>" + bad + "</a>")) << bad;
+}
+
+TEST(XmlGuardTest, KeepsTheLimits) {
+    const auto nested = [](std::size_t depth) {
+        std::string text;
+        for (std::size_t i = 0; i < depth; ++i)
+            text = "<a>" + text + "</a>";
+        return text;
+    };
+    EXPECT_TRUE(isAccepted(nested(64)));
+    EXPECT_FALSE(isAccepted(nested(65)));
+    EXPECT_FALSE(isAccepted(nested(1000)));
+    EXPECT_TRUE(isAccepted("<a><b/><b/></a>", {.elements = 3}));
+    EXPECT_FALSE(isAccepted("<a><b/><b/><b/></a>", {.elements = 3}));
+    EXPECT_TRUE(isAccepted("<a b='' c=''/>", {.attributes = 2}));
+    EXPECT_FALSE(isAccepted("<a b='' c='' d=''/>", {.attributes = 2}));
+}
+
+std::string escaped(const std::string& text) {
+    std::string out;
+    cimxml::appendEscaped(out, text);
+    return out;
+}
+
+TEST(XmlTextTest, AnyBytesBecomeTextThatIsAccepted) {
+    EXPECT_EQ(escaped("a<b>&\"c' \t\r\n"), "a&lt;b&gt;&amp;&quot;c' \t\r\n");
+    EXPECT_EQ(escaped("\0\x01x\x1Fy\x7F"s), "xy\x7F");
+    EXPECT_EQ(escaped("\xC3\xBC\xF0\x9F\x98\x80"), "\xC3\xBC\xF0\x9F\x98\x80");
+    EXPECT_EQ(escaped("a\xC3"), "a\xEF\xBF\xBD");
+    EXPECT_EQ(escaped("\xED\xA0\x80"), "\xEF\xBF\xBD\xEF\xBF\xBD\xEF\xBF\xBD");
+    std::mt19937 random(1);
+    for (int round = 0; round < 2000; ++round) {
+        std::string bytes(random() % 40, ' ');
+        for (char& byte : bytes)
+            byte = static_cast<char>(random() % 3 == 0 ? 0x80 + random() % 128 : random());
+        const std::string text = escaped(bytes);
+        ASSERT_TRUE(isAccepted("<a b=\"" + text + "\">" + text + "</a>")) << text;
+    }
+}
+
+}  // namespace
