@@ -4,12 +4,9 @@
 #include <CLI/CLI.hpp>
 #include <algorithm>
 #include <iostream>
-#include <memory>
 #include <set>
 #include <string_view>
 
-#include "Cli/Failure.h"
-#include "Cli/Suggestion.h"
 #include "Utils/Utils.h"
 
 #ifndef QUENX_VERSION
@@ -20,7 +17,7 @@ namespace cli {
 
 namespace {
 
-constexpr const char* FOOTER =
+constexpr const char* kFooter =
     "Exit status:\n"
     "  0  done\n"
     "  1  failed or refused: the message says what happened, and what to do next where that helps\n"
@@ -28,186 +25,142 @@ constexpr const char* FOOTER =
     "  3  already current: what was to be installed is what is installed (see --force)\n"
     "  4  not found: there is no such adapter, image file, identity, job, class or instance\n";
 
-constexpr const char* TARGET_TEXT = "Adapter: its name, PCI address or object path";
-constexpr const char* IDENTITY_TEXT = "Image: a software identity that \"identities\" lists";
-
-std::vector<std::string> typesOf(std::string text) {
-    utils::replaceCharacter(text, '+', ',');
-    std::vector<std::string> types;
-    for (const std::string& piece : utils::split(text, ','))
-        types.push_back(utils::trim(piece));
-    return types;
+/// An option, or without dashes an argument, that takes one value.
+CLI::Option* addValue(CLI::App& app, const char* name, std::string& value, const char* type,
+                      const char* description) {
+    return app.add_option(name, value, description)->type_name(type);
 }
 
-void addServerOptions(CLI::App& app, Arguments& arguments, const std::vector<CLI::Option*>& localOptions) {
-    ServerSettings& server = arguments.server;
+void addServerOptions(CLI::App& app, ServerSettings& server, const std::vector<CLI::Option*>& localOptions) {
     CLI::Option* url =
         app.add_option_function<std::string>(
-               "--server", [&arguments](const std::string& text) { arguments.serverUrl.emplace(text); },
+               "--server", [&server](const std::string& text) { server.url.emplace(text); },
                "Use a WBEM server (https://host:5989) instead of this process; images are then files on "
                "that host")
             ->type_name("URL");
     for (CLI::Option* option : localOptions)
         option->excludes(url);
-    app.add_option("--user", server.user,
-                   "User on the server (default: QUENXCTL_USER, else asked for); the password is taken from "
-                   "QUENXCTL_PASSWORD or asked for")
-        ->type_name("NAME")
+    addValue(app, "--user", server.user, "NAME",
+             "User on the server (default: QUENXCTL_USER, else asked for); the password is taken from "
+             "QUENXCTL_PASSWORD or asked for")
         ->needs(url);
-    app.add_option("--namespace", server.namespaceName, "Namespace on the server")
-        ->type_name("NAME")
+    addValue(app, "--namespace", server.namespaceName, "NAME", "Namespace on the server")
         ->capture_default_str()
         ->needs(url);
-    CLI::Option* trusted = app.add_option("--cacert", server.caFile, "Trust the certificates in this file")
-                               ->type_name("FILE")
-                               ->needs(url);
+    CLI::Option* trusted =
+        addValue(app, "--cacert", server.caFile, "FILE", "Trust the certificates in this file")->needs(url);
     app.add_flag("--insecure", server.insecure, "Accept any server certificate: for tests only")
         ->needs(url)
         ->excludes(trusted);
 }
 
 void addCommonOptions(CLI::App& app, Arguments& arguments) {
+    ProviderSettings& providers = arguments.providers;
     app.add_flag("--json", arguments.json,
                  "Print the result, or the error, as one JSON document; progress goes to standard error");
     CLI::Option* config =
-        app.add_option("--config", arguments.local.configFile,
-                       "Configuration file of the providers (default: /etc/quenx-cimprovider.conf)")
-            ->type_name("FILE");
-    CLI::Option* adapters = app.add_option("--adapters", arguments.local.adapterDescription,
-                                           "Description of simulated adapters (default: QUENX_ADAPTERS, else "
-                                           "/etc/quenx-adapters.toml)")
-                                ->type_name("FILE");
-    app.add_option(
-           "--state", arguments.local.stateDirectory,
-           "Where the simulated adapters of --adapters keep their flash (default: QUENX_ADAPTER_STATE, "
-           "else beside FILE, with the extension .state)")
-        ->type_name("DIR")
+        addValue(app, "--config", providers.configFile, "FILE",
+                 "Configuration file of the providers (default: /etc/quenx-cimprovider.conf)");
+    CLI::Option* adapters = addValue(app, "--adapters", providers.adapterDescription, "FILE",
+                                     "Description of simulated adapters (default: QUENX_ADAPTERS, else "
+                                     "/etc/quenx-adapters.toml)");
+    addValue(app, "--state", providers.stateDirectory, "DIR",
+             "Where the simulated adapters of --adapters keep their flash (default: QUENX_ADAPTER_STATE, "
+             "else beside FILE, with the extension .state)")
         ->needs(adapters);
-    CLI::Option* providers =
-        app.add_option("--providers", arguments.local.providerDirectory,
-                       "Directory of the provider libraries (default: those installed with this program)")
-            ->type_name("DIR");
-    addServerOptions(app, arguments, {config, adapters, providers});
+    CLI::Option* directory =
+        addValue(app, "--providers", providers.directory, "DIR",
+                 "Directory of the provider libraries (default: those installed with this program)");
+    addServerOptions(app, arguments.server, {config, adapters, directory});
 }
 
-/// The image is named in one of two ways.
-void requireOneImage(const CLI::App& verb, const CLI::Option* file, const CLI::Option* identity) {
-    if (file->count() + identity->count() == 1) return;
-    throw CLI::ValidationError(verb.get_name(), "name one image, either as a file or with --identity");
+std::vector<std::string> typesOf(std::string text) {
+    utils::replaceCharacter(text, InstallOption::kTargetTypeSeparator, ',');
+    std::vector<std::string> types;
+    for (const std::string& piece : utils::split(text, ','))
+        types.push_back(utils::trim(piece));
+    return types;
 }
 
-CLI::Option* addTypes(CLI::App& verb, std::string& types) {
-    return verb
-        .add_option("--types", types,
-                    "Image types to install, separated by commas (default: all in the image)")
-        ->type_name("TYPES");
+/// What install and check have in common. Returns the option for an identity, which says its types itself.
+CLI::Option* addImageOptions(CLI::App& verb, ImageOptions& options, const char* imageText) {
+    addValue(verb, "--target", options.target, "ADAPTER", "Adapter: its name, PCI address or object path")
+        ->required();
+    addValue(verb, "image", options.image, "URI", imageText);
+    CLI::Option* identity = addValue(verb, "--identity", options.identity, "ID",
+                                     "Image: a software identity that \"identities\" lists");
+    const auto setTypes = [&options](const std::string& text) {
+        if (!text.empty()) options.types = typesOf(text);
+    };
+    verb.add_option_function<std::string>(
+            "--types", setTypes, "Image types to install, separated by commas (default: all in the image)")
+        ->type_name("TYPES")
+        ->excludes(identity);
+    return identity;
 }
 
-void addInstall(CLI::App& app, Arguments& arguments) {
+/// In the order in which the help lists them.
+void addVerbs(CLI::App& app, Arguments& arguments) {
+    VerbOptions& options = arguments.options;
+    const auto add = [&](const char* name, Verb verb, const char* description) {
+        CLI::App* added = app.add_subcommand(name, description);
+        added->callback([verb, &arguments] { arguments.verb = verb; });
+        return added;
+    };
+    add("adapters", showAdapters, "List the adapters and the firmware on them");
+    add("identities", showIdentities, "List the images that the inventory offers, and those installed");
+
     CLI::App* verb =
-        app.add_subcommand("install", "Install a firmware image on an adapter and wait until it is done");
-    verb->alias("update");
-    auto order = std::make_shared<InstallOrder>();
-    auto types = std::make_shared<std::string>();
-    verb->add_option("--target", order->target, TARGET_TEXT)->type_name("ADAPTER")->required();
-    CLI::Option* image =
-        verb->add_option("image", order->image, "Image: a path or a file URI")->type_name("URI");
-    CLI::Option* identity = verb->add_option("--identity", order->identity, IDENTITY_TEXT)->type_name("ID");
-    addTypes(*verb, *types)->excludes(identity);
-    verb->add_flag("--force", order->force, "Also install an older image, or the same one again");
-    verb->footer("An update that has begun always runs to its end: Ctrl-C does not stop it.");
-    verb->callback([=, &arguments] {
-        requireOneImage(*verb, image, identity);
-        if (!types->empty()) order->types = typesOf(*types);
-        arguments.startsUpdate = true;
-        arguments.verb = [order](Context& context) { return install(context, *order); };
-    });
-}
-
-void addCheck(CLI::App& app, Arguments& arguments) {
-    CLI::App* verb = app.add_subcommand(
-        "check",
-        "Say whether an image could be installed, without writing it (a server may hold the adapter)");
-    auto order = std::make_shared<CheckOrder>();
-    auto types = std::make_shared<std::string>();
-    verb->add_option("--target", order->target, TARGET_TEXT)->type_name("ADAPTER")->required();
-    CLI::Option* file =
-        verb->add_option("image", order->file,
-                         "Image: a path or a file URI; with --server only one that \"identities\" lists")
-            ->type_name("URI");
-    CLI::Option* identity = verb->add_option("--identity", order->identity, IDENTITY_TEXT)->type_name("ID");
-    addTypes(*verb, *types)->excludes(identity);
-    verb->add_flag("--force", order->force, "Check whether it could be installed with --force")
+        add("check", check,
+            "Say whether an image could be installed, without writing it (a server may hold the adapter)");
+    CLI::Option* identity =
+        addImageOptions(*verb, options.image,
+                        "Image: a path or a file URI; with --server only one that \"identities\" lists");
+    verb->add_flag("--force", options.image.force, "Check whether it could be installed with --force")
         ->excludes(identity);
     verb->footer("--types and --force cannot be used with --server.");
-    verb->callback([=, &arguments] {
-        requireOneImage(*verb, file, identity);
-        if (!types->empty()) order->types = typesOf(*types);
-        arguments.verb = [order](Context& context) { return check(context, *order); };
-    });
-}
 
-void addInstances(CLI::App& app, Arguments& arguments) {
-    CLI::App* verb = app.add_subcommand("instances", "List the instances of a class");
-    auto order = std::make_shared<InstancesOrder>();
-    verb->add_option("class", order->className, "Class, for example Quenx_ConcreteJob")
-        ->type_name("CLASS")
+    verb = add("install", install, "Install a firmware image on an adapter and wait until it is done");
+    verb->alias("update");
+    addImageOptions(*verb, options.image, "Image: a path or a file URI");
+    verb->add_flag("--force", options.image.force, "Also install an older image, or the same one again");
+    verb->footer("An update that has begun always runs to its end: Ctrl-C does not stop it.");
+
+    add("jobs", showJobs, "List the jobs on a server");
+    verb = add("delete", deleteJob, "Delete a job from the list of a server; its update continues");
+    addValue(*verb, "job", options.job, "JOB", "Job: its id as \"jobs\" lists it, or the number at its end")
         ->required();
-    verb->add_flag("--names", order->namesOnly, "Only their object paths");
-    verb->callback([order, &arguments] {
-        arguments.verb = [order](Context& context) { return showInstances(context, *order); };
-    });
-}
 
-void addAssociators(CLI::App& app, Arguments& arguments) {
-    CLI::App* verb = app.add_subcommand("associators", "List the instances associated with an instance");
-    auto order = std::make_shared<AssociatorsOrder>();
-    verb->add_option("path", order->path, "Object path, as \"instances CLASS --names\" prints it")
-        ->type_name("PATH")
+    verb = add("instances", showInstances, "List the instances of a class");
+    addValue(*verb, "class", options.className, "CLASS", "Class, for example Quenx_ConcreteJob")->required();
+    verb->add_flag("--names", options.namesOnly, "Only their object paths");
+
+    verb = add("associators", showAssociators, "List the instances associated with an instance");
+    addValue(*verb, "path", options.path, "PATH", "Object path, as \"instances CLASS --names\" prints it")
         ->required();
-    verb->add_option("--class", order->filter.associationClass, "Only through associations of this class")
-        ->type_name("CLASS");
-    verb->add_option("--result-class", order->filter.resultClass, "Only instances of this class")
-        ->type_name("CLASS");
-    verb->add_option("--role", order->filter.role, "Only where the instance has this role")
-        ->type_name("ROLE");
-    verb->add_option("--result-role", order->filter.resultRole, "Only instances with this role")
-        ->type_name("ROLE");
-    verb->add_flag("--names", order->namesOnly, "Only their object paths");
-    verb->callback([order, &arguments] {
-        arguments.verb = [order](Context& context) { return showAssociators(context, *order); };
-    });
+    addValue(*verb, "--class", options.filter.associationClass, "CLASS",
+             "Only through associations of this class");
+    addValue(*verb, "--result-class", options.filter.resultClass, "CLASS", "Only instances of this class");
+    addValue(*verb, "--role", options.filter.role, "ROLE", "Only where the instance has this role");
+    addValue(*verb, "--result-role", options.filter.resultRole, "ROLE", "Only instances with this role");
+    verb->add_flag("--names", options.namesOnly, "Only their object paths");
+
+    add("mof", showMof, "Print the schema of all served classes as MOF");
 }
 
-void addDelete(CLI::App& app, Arguments& arguments) {
-    CLI::App* verb =
-        app.add_subcommand("delete", "Delete a job from the list of a server; its update continues");
-    auto job = std::make_shared<std::string>();
-    verb->add_option("job", *job, "Job: its id as \"jobs\" lists it, or the number at its end")
-        ->type_name("JOB")
-        ->required();
-    verb->callback(
-        [job, &arguments] { arguments.verb = [job](Context& context) { return deleteJob(context, *job); }; });
-}
-
-void addPlainVerb(CLI::App& app, Arguments& arguments, const char* name, const char* description,
-                  ExitStatus (*verb)(Context&)) {
-    app.add_subcommand(name, description)->callback([verb, &arguments] { arguments.verb = verb; });
-}
-
-constexpr const char* ASK_HELP = "\"quenxctl --help\" lists the verbs and options.";
+constexpr const char* kAskHelp = "\"quenxctl --help\" lists the verbs and options.";
 
 std::vector<const CLI::App*> verbsOf(const CLI::App& app) {
     return app.get_subcommands([](const CLI::App*) { return true; });
 }
 
-Failure unknownVerb(const CLI::App& app, const std::string& name) {
+CommandError unknownVerb(const CLI::App& app, const std::string& name) {
     std::vector<std::string> names;
     for (const CLI::App* verb : verbsOf(app)) {
         names.push_back(verb->get_name());
         names.insert(names.end(), verb->get_aliases().begin(), verb->get_aliases().end());
     }
-    return {ExitStatus::WrongUse, "There is no verb \"" + name + "\".", didYouMean(name, names) + ASK_HELP};
+    return {ExitStatus::WrongUse, "There is no verb \"" + name + "\".", didYouMean(name, names) + kAskHelp};
 }
 
 std::string askHelpOf(const CLI::App& verb) {
@@ -233,7 +186,7 @@ std::vector<std::string> optionsOf(const CLI::App& app, const CLI::App* verb) {
 }
 
 /// A misspelt option is the cause of what the library tells first: that another is missing.
-std::optional<Failure> unknownOption(const CLI::App& app, const CLI::App* verb) {
+std::optional<CommandError> unknownOption(const CLI::App& app, const CLI::App* verb) {
     const std::vector<std::string> rest = app.remaining(true);
     const auto word = std::find_if(rest.begin(), rest.end(), isLongOption);
     // Behind an unknown verb, options may be right for the verb that was meant.
@@ -242,20 +195,47 @@ std::optional<Failure> unknownOption(const CLI::App& app, const CLI::App* verb) 
     const std::vector<std::string> known = optionsOf(app, verb);
     if (std::find(known.begin(), known.end(), name) != known.end()) return std::nullopt;
     const std::string subject = verb == nullptr ? "There is" : "\"" + verb->get_name() + "\" has";
-    return Failure(ExitStatus::WrongUse, subject + " no option \"" + name + "\".",
-                   didYouMean(name, known) + (verb == nullptr ? ASK_HELP : askHelpOf(*verb)));
+    return CommandError(ExitStatus::WrongUse, subject + " no option \"" + name + "\".",
+                        didYouMean(name, known) + (verb == nullptr ? kAskHelp : askHelpOf(*verb)));
+}
+
+/// What the library found wrong, in this program's words; its own text names the option.
+std::string messageOf(const CLI::App& app, const CLI::App& verb, const CLI::ParseError& error) {
+    const std::string text = error.what();
+    const std::size_t dashes = text.find("--");
+    const std::size_t start = dashes == std::string::npos ? 0 : dashes;
+    const std::string option = text.substr(start, text.find_first_of(": ", start) - start);
+    switch (static_cast<CLI::ExitCodes>(error.get_exit_code())) {
+        case CLI::ExitCodes::ExtrasError:
+            return "Unexpected argument \"" + app.remaining(true).front() + "\".";
+        case CLI::ExitCodes::ExcludesError:
+            return option + " cannot be used with " + text.substr(text.rfind(' ') + 1) + ".";
+        case CLI::ExitCodes::ArgumentMismatch:
+            return option + (text.find("At Most") == std::string::npos ? " needs a value."
+                                                                       : " can be given only once.");
+        case CLI::ExitCodes::ConversionError:
+            return option + " takes no value.";  // texts always convert, so it was a flag
+        case CLI::ExitCodes::RequiredError: {
+            // Arguments have a name only to the library; the help shows what they are.
+            const CLI::Option* argument = verb.get_option_no_throw(option);
+            const bool isArgument = argument != nullptr && argument->get_positional();
+            return (isArgument ? argument->get_type_name() : option) + " is required.";
+        }
+        default:
+            return text + ".";
+    }
 }
 
 /// The library only says that a verb is missing, both where there is none and where it is unknown.
-Failure wrongUse(const CLI::App& app, const CLI::ParseError& error) {
+CommandError wrongUse(const CLI::App& app, const CLI::ParseError& error) {
     const auto verbs = app.get_subcommands();
     const CLI::App* verb = verbs.empty() ? nullptr : verbs.front();
-    if (const std::optional<Failure> unknown = unknownOption(app, verb)) return *unknown;
-    if (verb != nullptr) return {ExitStatus::WrongUse, std::string(error.what()) + ".", askHelpOf(*verb)};
+    if (const std::optional<CommandError> unknown = unknownOption(app, verb)) return *unknown;
+    if (verb != nullptr) return {ExitStatus::WrongUse, messageOf(app, *verb, error), askHelpOf(*verb)};
+    if (error.get_exit_code() != static_cast<int>(CLI::ExitCodes::RequiredError))
+        return {ExitStatus::WrongUse, messageOf(app, app, error), kAskHelp};
     const std::vector<std::string> rest = app.remaining();
-    if (error.get_name() != "RequiredError")
-        return {ExitStatus::WrongUse, error.what() + std::string("."), ASK_HELP};
-    return rest.empty() ? Failure(ExitStatus::WrongUse, "No verb was given.", ASK_HELP)
+    return rest.empty() ? CommandError(ExitStatus::WrongUse, "No verb was given.", kAskHelp)
                         : unknownVerb(app, rest.front());
 }
 
@@ -281,35 +261,30 @@ std::optional<Arguments> readArguments(int argc, char** argv) {
     app.require_subcommand(1);
     app.fallthrough();
     addCommonOptions(app, arguments);
-    addPlainVerb(app, arguments, "adapters", "List the adapters and the firmware on them", showAdapters);
-    addPlainVerb(app, arguments, "identities",
-                 "List the images that the inventory offers, and those installed", showIdentities);
-    addCheck(app, arguments);
-    addInstall(app, arguments);
-    addPlainVerb(app, arguments, "jobs", "List the jobs on a server", showJobs);
-    addDelete(app, arguments);
-    addInstances(app, arguments);
-    addAssociators(app, arguments);
-    addPlainVerb(app, arguments, "mof", "Print the schema of all served classes as MOF", showMof);
+    addVerbs(app, arguments);
     std::string helpOf;
     CLI::App* help = app.add_subcommand("help", "Print this help, or that of a verb");
     help->add_option("verb", helpOf, "Verb")->type_name("VERB");
     for (CLI::App* verb : app.get_subcommands({}))
         verb->group("Verbs");
     app.get_formatter()->label("SUBCOMMAND", "VERB");
-    app.footer(FOOTER);  // last: verbs take over the footer that is there when they are added
+    app.footer(kFooter);  // last: verbs take over the footer that is there when they are added
     try {
         app.parse(argc, argv);
     } catch (const CLI::ParseError& error) {
-        if (error.get_exit_code() != 0) {
-            throw wrongUse(app, error);
-        }
+        if (error.get_exit_code() != 0) throw wrongUse(app, error);
         app.exit(error);
         return std::nullopt;
     }
     if (help->parsed()) {
         printHelp(app, helpOf);
         return std::nullopt;
+    }
+    const ImageOptions& image = arguments.options.image;
+    const bool takesImage = arguments.verb == install || arguments.verb == check;
+    if (takesImage && image.image.empty() == image.identity.empty()) {
+        throw CommandError(ExitStatus::WrongUse, "Name one image, either as a file or with --identity.",
+                           askHelpOf(*app.get_subcommands().front()));
     }
     return arguments;
 }

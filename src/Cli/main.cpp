@@ -1,6 +1,126 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "Cli/CommandLine.h"
+// quenxctl: reads the arguments, opens the way to the model, runs the verb, says what went wrong.
+#include <unistd.h>
+
+#include <array>
+#include <atomic>
+#include <chrono>
+#include <csignal>
+#include <iostream>
+#include <string_view>
+#include <thread>
+
+#include "Cli/Arguments.h"
+#include "Cli/Display/Output.h"
+
+namespace cli {
+
+namespace {
+
+constexpr const char* kAskLog = "The system log has the details.";
+
+std::atomic<bool> interruptionAsked{false};
+static_assert(std::atomic<bool>::is_always_lock_free, "a signal handler stores it");
+
+/// From here on, Ctrl-C, SIGTERM and a closed terminal do not end the program but are noted, and writing into
+/// a closed pipe is an error and no signal: a program that ends takes the running update with it.
+void noteInterruptions() {
+    struct sigaction action = {};
+    action.sa_handler = [](int) { interruptionAsked = true; };
+    action.sa_flags = SA_RESTART;
+    for (const int signal : {SIGINT, SIGTERM, SIGHUP})
+        sigaction(signal, &action, nullptr);
+    action.sa_handler = SIG_IGN;
+    sigaction(SIGPIPE, &action, nullptr);
+}
+
+std::string adviceFor(const core::CimError& error) {
+    switch (error.status()) {
+        case core::CimStatus::InvalidClass:
+            return kAskMof;
+        case core::CimStatus::InvalidParameter:
+        case core::CimStatus::NotFound:
+            return "\"quenxctl instances CLASS --names\" prints the paths of what there is.";
+        case core::CimStatus::AccessDenied:
+            return "Log in as a user who may do this: on quenx-cimd, an administrator.";
+        case core::CimStatus::InvalidNamespace:
+            return "Check --namespace, or the line \"Namespace=\" of the configuration file.";
+        case core::CimStatus::ServerIsShuttingDown:
+            return "Try again after its restart.";
+        default:
+            // The adapters then say what is wrong with their description.
+            return std::string_view(error.what()).starts_with("QUENX_ADAPTERS")
+                       ? "Correct QUENX_ADAPTERS or the file that it names."
+                       : kAskLog;
+    }
+}
+
+ExitStatus statusFor(core::CimStatus status) {
+    const bool isMissing = status == core::CimStatus::NotFound || status == core::CimStatus::InvalidClass;
+    return isMissing ? ExitStatus::NotFound : ExitStatus::Failed;
+}
+
+/// An error text of the model or a server, which may be no more than a few words, as a sentence.
+std::string sentence(std::string text) {
+    if (text.empty()) return "The service gave no reason.";
+    if (text.front() >= 'a' && text.front() <= 'z')
+        text.front() = static_cast<char>(text.front() - 'a' + 'A');
+    if (std::string_view(".!?").find(text.back()) == std::string_view::npos) text += '.';
+    return text;
+}
+
+ExitStatus report(bool json, ExitStatus status, const std::string& what, const std::string& advice) {
+    if (json) {
+        printJson(std::cout, {{"error", what}, {"advice", advice}, {"exitStatus", static_cast<int>(status)}});
+        return status;
+    }
+    std::cerr << "quenxctl: " << printable(what) << '\n';
+    if (!advice.empty()) std::cerr << printable(advice) << '\n';
+    return status;
+}
+
+ExitStatus runVerb(const Arguments& arguments) {
+    LinePrinter printer(arguments.json ? std::cerr : std::cout,
+                        Terminal::of(arguments.json ? STDERR_FILENO : STDOUT_FILENO));
+    ProgressDisplay progress(printer);
+    const Connection connection =
+        arguments.server.url ? openServer(arguments.server) : openProviders(arguments.providers);
+    // After a prompt for the password, at which Ctrl-C is to end the program.
+    if (arguments.startsUpdate()) noteInterruptions();
+    const std::chrono::milliseconds pause(connection.runsJobs ? 50 : 500);
+    const Following following = {[pause] { std::this_thread::sleep_for(pause); },
+                                 [] { return interruptionAsked.exchange(false); }};
+    Context context{connection, std::cout, std::cerr, arguments.json, progress, following};
+    return arguments.verb(context, arguments.options);
+}
+
+/// @param arguments  set once they are read
+ExitStatus runAndReport(int argc, char** argv, std::optional<Arguments>& arguments) {
+    const bool json = asksForJson(argc, argv);
+    try {
+        arguments = readArguments(argc, argv);
+        return arguments ? runVerb(*arguments) : ExitStatus::Done;
+    } catch (const CommandError& error) {
+        return report(json, error.status(), error.what(), error.advice());
+    } catch (const core::CimError& error) {
+        return report(json, statusFor(error.status()), sentence(error.what()), adviceFor(error));
+    } catch (const std::exception& error) {
+        return report(json, ExitStatus::Failed, sentence(error.what()), kAskLog);
+    }
+}
+
+}  // namespace
+
+}  // namespace cli
 
 int main(int argc, char** argv) {
-    return cli::runCommandLine(argc, argv);
+    std::optional<cli::Arguments> arguments;
+    cli::ExitStatus status = cli::runAndReport(argc, argv, arguments);
+    // A result that nobody could read is none; an update, though, is done whoever reads of it.
+    const bool mayHaveUpdated = arguments && arguments->startsUpdate();
+    if (!std::cout.flush() && !mayHaveUpdated && status == cli::ExitStatus::Done) {
+        std::cerr << "quenxctl: Cannot write the output.\n";
+        status = cli::ExitStatus::Failed;
+    }
+    return static_cast<int>(status);
 }

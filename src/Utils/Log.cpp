@@ -32,6 +32,13 @@ constexpr std::size_t skippedFrames = 3;
 
 std::mutex openMutex;
 
+// The first backtrace of a process loads a library. Were that the one of an error in a worker while dlclose
+// waits for the worker, neither would ever end, since dlclose holds the loader's lock.
+const int kBacktraceLoaded = [] {
+    void* frame = nullptr;
+    return backtrace(&frame, 1);
+}();
+
 /// Leaves errno as it was found, and gives it back in between to those who print it.
 class ErrnoKeeper {
   public:

@@ -2,6 +2,7 @@
 // The provider's library goes while its jobs are new, running or finished, and comes back.
 #include <gtest/gtest.h>
 
+#include <filesystem>
 #include <thread>
 
 #include "Providers/SoftwareUpdate/HookedBackend.h"
@@ -114,21 +115,23 @@ TEST_F(UnloadTest, TheEndOfTheProcessWaitsForTheFlash) {
         ::testing::ExitedWithCode(0), "Updating CapabilityWord");
 }
 
-/// What the plain host prints when it loads the libraries in this order and closes the one with that index
-/// first.
-std::string plainHost(const char* loadedFirst, const char* loadedSecond, int closedFirst) {
+/// What a program prints. The folder of the build may have blanks in its name.
+std::string outputOf(const std::vector<std::string>& words) {
     std::string command;
-    // The folder of the build may have blanks in its name.
-    for (const std::string& word :
-         {std::string(QUENX_PLAIN_HOST), std::string(loadedFirst), std::string(loadedSecond),
-          std::string(QUENX_AGENT_COUNT), std::to_string(closedFirst)}) {
+    for (const std::string& word : words)
         command += "'" + word + "' ";
-    }
     const std::unique_ptr<std::FILE, int (*)(std::FILE*)> output(popen(command.c_str(), "r"), pclose);
     std::string text;
     for (int c = std::fgetc(output.get()); c != EOF; c = std::fgetc(output.get()))
         text += static_cast<char>(c);
     return text;
+}
+
+/// What the plain host prints when it loads the libraries in this order and closes the one with that index
+/// first.
+std::string plainHost(const char* loadedFirst, const char* loadedSecond, int closedFirst) {
+    return outputOf(
+        {QUENX_PLAIN_HOST, loadedFirst, loadedSecond, QUENX_AGENT_COUNT, std::to_string(closedFirst)});
 }
 
 TEST(PlainHostTest, LeavesNothingMappedWhicheverProviderItClosesFirst) {
@@ -140,6 +143,53 @@ TEST(PlainHostTest, LeavesNothingMappedWhicheverProviderItClosesFirst) {
         EXPECT_EQ(plainHost(one, other, 0), begin + "1 agents, mapped: 0 1\n" + end) << one;
         EXPECT_EQ(plainHost(one, other, 1), begin + "1 agents, mapped: 1 0\n" + end) << one;
     }
+}
+
+// dlclose holds the loader's lock while it waits for workers and requests. Whatever these do for the first
+// time in the process or on their thread must not need that lock: a backtrace, a thread-local variable, an
+// exception.
+TEST(HostOfCTest, UnloadsWhileFlashesFailAndRequestsAreRefused) {
+    if (!ProviderLibrary::isUnloadable()) GTEST_SKIP() << "sanitizer builds keep the library";
+    const test::TempFolder folder;
+    const auto rom = test::madeRom({{FirmwareType::PXE, 2}, {FirmwareType::UEFI, 1}});
+    const std::string uri = "file://" + folder.write("image.rom", std::span(rom));
+    for (const std::string action : {"fail", "throw"}) {
+        folder.write("adapters.toml", R"(
+            [[adapter]]
+            name = "eth0"
+            pci_address = "0000:03:00.0"
+            pci_id = "1af4:1041"
+            mac = "52:54:00:00:00:10"
+            components = [ { type = "IMG_PXE", revision = 1 }, { type = "IMG_UEFI", revision = 0 } ]
+            [[adapter.fault]]
+            at = "write"
+            action = "stall"
+            milliseconds = 200
+            [[adapter.fault]]
+            at = "write"
+            percent = 50
+            text = "the device went away"
+            action = ")" + action + "\"\n");
+        for (const std::string use : {"flash", "calls"}) {
+            EXPECT_EQ(
+                outputOf({"env", "QUENX_ADAPTERS=" + folder / "adapters.toml",
+                          "QUENX_ADAPTER_STATE=" + folder / "state", QUENX_HOST_OF_C, QUENX_INVENTORY_LIBRARY,
+                          QUENX_UPDATE_LIBRARY, QUENX_FLASH_STARTER, use, uri}),
+                "unloaded\n")
+                << use << ' ' << action;
+        }
+    }
+}
+
+TEST(LibrariesTest, BindAllSymbolsWhenTheyAreLoaded) {
+    int libraries = 0;
+    for (const auto& entry :
+         std::filesystem::directory_iterator(std::filesystem::path(QUENX_UPDATE_LIBRARY).parent_path())) {
+        if (!entry.path().filename().string().starts_with("libQuenx_")) continue;
+        ++libraries;
+        EXPECT_NE(outputOf({"readelf", "-d", entry.path()}).find("BIND_NOW"), std::string::npos) << entry;
+    }
+    EXPECT_GE(libraries, 6);
 }
 
 }  // namespace

@@ -1,10 +1,17 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "System/Quenxctl.h"
 
-#include <algorithm>
-#include <nlohmann/json.hpp>
+#include <sstream>
 
 namespace test {
+
+std::vector<std::string> wordsOf(const std::string& line, const std::string& image) {
+    std::vector<std::string> words;
+    std::istringstream stream(line);
+    for (std::string word; std::getline(stream, word, ' ');)
+        words.push_back(word == "IMAGE" ? image : word);
+    return words;
+}
 
 void Quenxctl::describeAdapters(const std::string& fault) {
     std::string description = kTestAdapters;
@@ -12,44 +19,30 @@ void Quenxctl::describeAdapters(const std::string& fault) {
         description.insert(description.find("[[adapter]]\nname = \"eth1\""),
                            "[[adapter.fault]]\nat = \"write\"\n" + fault + "\n");
     }
-    folder_.write("adapters.toml", description);
+    m_folder.write("adapters.toml", description);
 }
 
-std::vector<std::string> Quenxctl::command(const std::vector<std::string>& arguments) const {
-    std::vector<std::string> all = {QUENXCTL, "--adapters", folder_ / "adapters.toml"};
+std::vector<std::string> Quenxctl::command(const std::string& line) const {
+    std::vector<std::string> all = {QUENXCTL, "--adapters", m_folder / "adapters.toml"};
     // Never the machine's own.
-    if (std::find(arguments.begin(), arguments.end(), "--config") == arguments.end())
-        all.insert(all.end(), {"--config", configuration_});
-    all.insert(all.end(), arguments.begin(), arguments.end());
+    if (!contains(line, "--config")) all.insert(all.end(), {"--config", m_configuration});
+    const std::vector<std::string> words = wordsOf(line, m_image);
+    all.insert(all.end(), words.begin(), words.end());
     return all;
 }
 
-ProgramResult Quenxctl::quenxctl(const std::vector<std::string>& arguments,
-                                 const std::vector<std::string>& environment) const {
-    return run(command(arguments), environment);
-}
-
-void Quenxctl::expectError(const std::vector<std::string>& arguments, int status,
-                           const std::string& part) const {
-    const ProgramResult result = quenxctl(arguments);
-    EXPECT_EQ(result.status, status) << part << "\n" << result.out << result.error;
-    EXPECT_TRUE(contains(result.error, part)) << result.error << "\nwanted: " << part;
+void Quenxctl::expectError(const std::string& line, int status, const std::string& part) const {
+    const ProgramResult result = quenxctl(line);
+    EXPECT_EQ(result.status, status) << line << "\n" << result.out << result.error;
+    EXPECT_TRUE(contains(result.error, part)) << line << "\n" << result.error << "\nwanted: " << part;
 }
 
 std::string Quenxctl::firmwareOf(const std::string& adapter) const {
-    const ProgramResult result = quenxctl({"adapters", "--json"});
-    const auto document = nlohmann::json::parse(result.out, nullptr, false);
-    if (document.is_discarded()) return "no document: " + result.out + result.error;
-    for (const auto& one : document["adapters"]) {
-        if (one["name"] != adapter) continue;
-        std::string text;
-        for (const auto& component : one["components"]) {
-            text += (text.empty() ? "" : ", ") + component["type"].get<std::string>() + " " +
-                    std::to_string(component["version"].get<int>());
-        }
-        return text;
-    }
-    return "no such adapter";
+    const std::string table = quenxctl("adapters").out;
+    const std::size_t row = table.find("\n" + adapter + " ");
+    if (row == std::string::npos) return "no such adapter in " + table;
+    const std::size_t from = table.find("IMG_", row);
+    return table.substr(from, table.find("  ", from) - from);
 }
 
 }  // namespace test

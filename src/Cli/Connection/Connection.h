@@ -1,0 +1,66 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include <memory>
+#include <optional>
+#include <string>
+
+#include "Framework/Requests/CimOperations.h"
+
+namespace cli {
+
+/// The way to the management model: in this process, or over the wire. Used from one thread.
+struct Connection {
+    /// Never null. Errors of the model are core::CimError; errors of the way itself are CommandError. Giving
+    /// up the last copy unloads the providers of this process, which waits for the updates that have begun.
+    std::shared_ptr<core::CimOperations> operations;
+    bool runsJobs = true;     ///< jobs run in this process, so end with it
+    bool sharesFiles = true;  ///< a path means the same file to this program as to the service
+};
+
+/// The providers to load; an empty text leaves the choice to the system.
+struct ProviderSettings {
+    std::string configFile;          ///< the providers' configuration file
+    std::string adapterDescription;  ///< description of simulated adapters
+    std::string stateDirectory;      ///< where those keep their flash; only with a description
+    std::string directory;           ///< where the provider libraries are
+};
+
+/// Loads the providers into this process. Throws CommandError when a file or library cannot be had, naming
+/// it.
+Connection openProviders(const ProviderSettings& settings);
+
+/// The address of a CIM-XML server, whole: scheme, host, port and path.
+class ServerUrl {
+  public:
+    /// Reads "https://host", with a port and a path that may be left out. Throws CommandError that says how
+    /// to write it: a user who mistypes it shall not send a password in clear, or to another host.
+    explicit ServerUrl(const std::string& text);
+
+    const std::string& text() const { return m_text; }
+    bool isEncrypted() const { return m_isEncrypted; }
+    /// True when the server is on this machine.
+    bool isLoopback() const { return m_isLoopback; }
+
+  private:
+    std::string m_text;
+    bool m_isEncrypted = false;
+    bool m_isLoopback = false;
+};
+
+/// The server to use, and how to log in to it.
+struct ServerSettings {
+    std::optional<ServerUrl> url;
+    std::string user;       ///< empty: QUENXCTL_USER, else asked for on the terminal
+    std::string caFile;     ///< certificates to trust in place of the system's; empty for those
+    bool insecure = false;  ///< any certificate is taken
+    std::string namespaceName = "root/cimv2";
+};
+
+/// Prepares requests to any WBEM server that serves these classes, over CIM-XML; nothing is sent yet. Warns
+/// on standard error of what gives the password away. The password is QUENXCTL_PASSWORD, else asked for on
+/// the terminal. Throws CommandError where nobody can answer.
+/// @param settings  with a URL
+Connection openServer(const ServerSettings& settings);
+
+}  // namespace cli

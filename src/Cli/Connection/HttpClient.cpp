@@ -1,0 +1,162 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "Cli/Connection/HttpClient.h"
+
+#include <arpa/inet.h>
+
+#include <string_view>
+
+#include "Cli/Display/Messages.h"
+#include "Utils/Utils.h"
+
+namespace cli {
+
+namespace {
+
+using UrlParts = std::unique_ptr<CURLU, decltype(&curl_url_cleanup)>;
+
+[[noreturn]] void refuseUrl(const std::string& text, const std::string& why) {
+    // What stands before an @ may be a password.
+    const std::string shown = text.find('@') == std::string::npos ? " \"" + text + "\"" : std::string();
+    throw CommandError(ExitStatus::WrongUse, "--server" + shown + " " + why + ".",
+                       "Write it as https://host:5989.");
+}
+
+/// Empty when the URL has no such part.
+std::string partOf(const UrlParts& url, CURLUPart part) {
+    char* text = nullptr;
+    if (curl_url_get(url.get(), part, &text, 0) != CURLUE_OK) return {};
+    std::string result = text;
+    curl_free(text);
+    return result;
+}
+
+bool isLoopbackHost(const std::string& host) {
+    in_addr address{};
+    if (inet_pton(AF_INET, host.c_str(), &address) == 1) return (ntohl(address.s_addr) >> 24) == 127;
+    return host == "localhost" || host == "[::1]";
+}
+
+std::size_t takeBody(char* data, std::size_t, std::size_t count, void* to) {
+    constexpr std::size_t kLargest = std::size_t{256} << 20;
+    auto& body = static_cast<HttpReply*>(to)->body;
+    // Anything but the count ends the transfer: a broken server must not fill the memory.
+    if (count > kLargest - body.size()) return 0;
+    body.append(data, count);
+    return count;
+}
+
+std::size_t takeHeader(char* data, std::size_t, std::size_t count, void* to) {
+    auto& reply = *static_cast<HttpReply*>(to);
+    const std::string_view line(data, count);
+    const std::size_t colon = line.find(':');
+    if (colon == std::string_view::npos) return count;
+    const auto keep = [&](std::string_view name, std::string& value) {
+        if (!utils::equalsIgnoringCase(line.substr(0, colon), name)) return;
+        value = std::string(utils::trimOf(line.substr(colon + 1), " \t\r\n"));
+    };
+    keep("CIMError", reply.cimError);
+    keep("Retry-After", reply.retryAfter);
+    return count;
+}
+
+/// @param isEncrypted  whether the request was
+std::string adviceFor(CURLcode code, bool isEncrypted) {
+    switch (code) {
+        case CURLE_PEER_FAILED_VERIFICATION:
+            return "Name the server's certificate, or the one that signed it, with --cacert.";
+        case CURLE_SSL_CACERT_BADFILE:
+            return "Name a readable file with PEM certificates with --cacert.";
+        case CURLE_COULDNT_CONNECT:
+        case CURLE_COULDNT_RESOLVE_HOST:
+        case CURLE_OPERATION_TIMEDOUT:
+            return "Check that the server runs and that --server names its host and port.";
+        case CURLE_GOT_NOTHING:
+        case CURLE_RECV_ERROR:
+            if (!isEncrypted) return "The port may be one for HTTPS: try https:// in --server.";
+            [[fallthrough]];
+        default:
+            return "Check --server.";
+    }
+}
+
+}  // namespace
+
+ServerUrl::ServerUrl(const std::string& text) {
+    if (text.find("://") == std::string::npos) refuseUrl(text, "does not begin with https:// or http://");
+    const UrlParts url(curl_url(), curl_url_cleanup);
+    const CURLUcode error = curl_url_set(url.get(), CURLUPART_URL, text.c_str(), CURLU_NON_SUPPORT_SCHEME);
+    if (error != CURLUE_OK) refuseUrl(text, std::string("is not a URL: ") + curl_url_strerror(error));
+    const std::string scheme = partOf(url, CURLUPART_SCHEME);
+    if (scheme != "https" && scheme != "http") refuseUrl(text, "does not begin with https:// or http://");
+    if (!partOf(url, CURLUPART_USER).empty() || !partOf(url, CURLUPART_PASSWORD).empty()) {
+        throw CommandError(
+            ExitStatus::WrongUse, "--server holds a user name or a password.",
+            "Name the user with --user, and leave the password to QUENXCTL_PASSWORD or the prompt.");
+    }
+    m_isEncrypted = scheme == "https";
+    // The ports that are registered for CIM-XML, and not those of the scheme.
+    if (partOf(url, CURLUPART_PORT).empty())
+        curl_url_set(url.get(), CURLUPART_PORT, m_isEncrypted ? "5989" : "5988", 0);
+    if (partOf(url, CURLUPART_PATH) == "/") curl_url_set(url.get(), CURLUPART_PATH, "/cimom", 0);
+    m_isLoopback = isLoopbackHost(partOf(url, CURLUPART_HOST));
+    m_text = partOf(url, CURLUPART_URL);
+}
+
+HttpClient::HttpClient(const ServerSettings& settings, const std::string& user, const std::string& password)
+    : m_curl(curl_easy_init(), curl_easy_cleanup),
+      m_url(settings.url->text()),
+      m_namesCaFile(!settings.caFile.empty()) {
+    if (m_curl == nullptr) {
+        throw CommandError(ExitStatus::Failed, "Cannot start the HTTP library.",
+                           "Free some memory and try again.");
+    }
+    constexpr long kConnectSeconds = 15;
+    // An answer may have to wait for the verification of a large image.
+    constexpr long kAnswerSeconds = 120;
+    set(CURLOPT_ERRORBUFFER, m_error.data());
+    set(CURLOPT_URL, m_url.c_str());
+    set(CURLOPT_PROTOCOLS_STR, "http,https");
+    set(CURLOPT_NOSIGNAL, 1L);
+    set(CURLOPT_CONNECTTIMEOUT, kConnectSeconds);
+    set(CURLOPT_TIMEOUT, kAnswerSeconds);
+    set(CURLOPT_WRITEFUNCTION, &takeBody);
+    set(CURLOPT_HEADERFUNCTION, &takeHeader);
+    set(CURLOPT_HTTPAUTH, CURLAUTH_BASIC);
+    set(CURLOPT_USERNAME, user.c_str());
+    set(CURLOPT_PASSWORD, password.c_str());
+    // A proxy would take 127.0.0.1 for itself, and get the password.
+    if (settings.url->isLoopback()) set(CURLOPT_NOPROXY, "*");
+    if (m_namesCaFile) set(CURLOPT_CAINFO, settings.caFile.c_str());
+    if (settings.insecure) {
+        set(CURLOPT_SSL_VERIFYPEER, 0L);
+        set(CURLOPT_SSL_VERIFYHOST, 0L);
+    }
+}
+
+HttpReply HttpClient::post(const std::vector<std::string>& headers, const std::string& body) {
+    HttpReply reply;
+    std::unique_ptr<curl_slist, decltype(&curl_slist_free_all)> list(nullptr, curl_slist_free_all);
+    for (const std::string& header : headers)
+        list.reset(curl_slist_append(list.release(), header.c_str()));
+    set(CURLOPT_HTTPHEADER, list.get());
+    set(CURLOPT_POSTFIELDS, body.c_str());
+    set(CURLOPT_POSTFIELDSIZE_LARGE, static_cast<curl_off_t>(body.size()));
+    set(CURLOPT_WRITEDATA, &reply);
+    set(CURLOPT_HEADERDATA, &reply);
+    m_error.front() = '\0';
+    const CURLcode code = curl_easy_perform(m_curl.get());
+    if (code != CURLE_OK) refuse(code);
+    curl_easy_getinfo(m_curl.get(), CURLINFO_RESPONSE_CODE, &reply.status);
+    return reply;
+}
+
+void HttpClient::refuse(CURLcode code) const {
+    // Where the system has no file of certificates either, the user has named no bad one: nobody is trusted.
+    if (code == CURLE_SSL_CACERT_BADFILE && !m_namesCaFile) code = CURLE_PEER_FAILED_VERIFICATION;
+    const std::string reason = m_error.front() == '\0' ? curl_easy_strerror(code) : m_error.data();
+    throw CommandError(code == CURLE_SSL_CACERT_BADFILE ? ExitStatus::WrongUse : ExitStatus::Failed,
+                       "The request to " + m_url + " failed: " + reason + ".",
+                       adviceFor(code, m_url.starts_with("https:")));
+}
+
+}  // namespace cli

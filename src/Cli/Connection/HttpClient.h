@@ -1,0 +1,45 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include <curl/curl.h>
+
+#include <array>
+#include <memory>
+#include <string>
+#include <vector>
+
+#include "Cli/Connection/Connection.h"
+
+namespace cli {
+
+struct HttpReply {
+    long status = 0;
+    std::string body;
+    std::string cimError;    ///< the header of that name
+    std::string retryAfter;  ///< likewise, in seconds
+};
+
+/// Requests to one server over one connection. Used from one thread.
+class HttpClient {
+  public:
+    HttpClient(const ServerSettings& settings, const std::string& user, const std::string& password);
+    HttpClient(const HttpClient&) = delete;
+    HttpClient& operator=(const HttpClient&) = delete;
+
+    /// Sends a body of XML. Throws CommandError when there is no answer.
+    HttpReply post(const std::vector<std::string>& headers, const std::string& body);
+
+  private:
+    template <class T>
+    void set(CURLoption option, T value) {
+        curl_easy_setopt(m_curl.get(), option, value);
+    }
+    [[noreturn]] void refuse(CURLcode code) const;
+
+    std::unique_ptr<CURL, decltype(&curl_easy_cleanup)> m_curl;
+    std::array<char, CURL_ERROR_SIZE> m_error{};
+    std::string m_url;
+    bool m_namesCaFile;
+};
+
+}  // namespace cli

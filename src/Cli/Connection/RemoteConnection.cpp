@@ -1,0 +1,273 @@
+// SPDX-License-Identifier: Apache-2.0
+#include <unistd.h>
+
+#include <algorithm>
+#include <cstdlib>
+#include <iostream>
+#include <utility>
+
+#include "CimXml/Request.h"
+#include "CimXml/Response.h"
+#include "CimXml/WireError.h"
+#include "Cli/Connection/HttpClient.h"
+#include "Cli/Display/Messages.h"
+#include "Utils/Os/Linux/EchoOff.h"
+#include "Utils/Utils.h"
+
+namespace cli {
+
+namespace {
+
+using cimxml::ClassName;
+using cimxml::IntrinsicResult;
+using Parameters = std::vector<cimxml::Parameter>;
+
+/// The form of names and paths in HTTP headers (DSP0200 6.2).
+std::string percentEncoded(const std::string& text) {
+    constexpr std::string_view kPlain = "._-=,";
+    std::string result;
+    for (const char c : text) {
+        if (utils::isLetter(c) || utils::isDigit(c) || kPlain.find(c) != std::string_view::npos)
+            result += c;
+        else
+            result += utils::formatStr("%%%02X", static_cast<unsigned char>(c));
+    }
+    return result;
+}
+
+Parameters withFilter(Parameters parameters, const core::PropertyFilter& filter) {
+    if (filter) parameters.push_back({"PropertyList", *filter});
+    return parameters;
+}
+
+Parameters associatorParameters(const core::CimPath& path, const core::AssociationFilter& by) {
+    Parameters parameters = {{"ObjectName", path}};
+    if (!by.associationClass.empty()) parameters.push_back({"AssocClass", ClassName{by.associationClass}});
+    if (!by.resultClass.empty()) parameters.push_back({"ResultClass", ClassName{by.resultClass}});
+    if (!by.role.empty()) parameters.push_back({"Role", by.role});
+    if (!by.resultRole.empty()) parameters.push_back({"ResultRole", by.resultRole});
+    return parameters;
+}
+
+/// To these operations the association is the result.
+Parameters referenceParameters(const core::CimPath& path, const core::AssociationFilter& by) {
+    const std::string& associationClass = by.associationClass.empty() ? by.resultClass : by.associationClass;
+    return associatorParameters(path, {"", associationClass, by.role, ""});
+}
+
+void requireOk(const HttpReply& reply) {
+    const std::string wait = reply.retryAfter.empty() ? "a while" : reply.retryAfter + " seconds";
+    const std::string why = reply.cimError.empty() ? "" : " (" + reply.cimError + ")";
+    switch (reply.status) {
+        case 200:
+            return;
+        case 401:
+            throw CommandError(ExitStatus::Failed, "The server does not accept the user name and password.",
+                               "Check --user or QUENXCTL_USER, and QUENXCTL_PASSWORD or what was typed.");
+        case 403:
+            throw CommandError(
+                ExitStatus::Failed, "This user may not use the server.",
+                "On quenx-cimd, log in as root, as a member of the group quenx-admin, or as a user whom "
+                "its setting auth.readers names.");
+        case 503:
+            throw CommandError(
+                ExitStatus::Failed,
+                "The server is busy, or it blocks log-ins from this address for a while after wrong "
+                "passwords.",
+                "Try again in " + wait + ".");
+        default:
+            throw CommandError(
+                ExitStatus::Failed,
+                "The server answered with HTTP status " + std::to_string(reply.status) + why + ".",
+                "Check that --server names a CIM-XML server; its log has the details.");
+    }
+}
+
+/// What a server answers over CIM-XML.
+class RemoteOperations : public core::CimOperations {
+  public:
+    RemoteOperations(const ServerSettings& settings, const std::string& user, const std::string& password)
+        : m_client(settings, user, password), m_namespace(settings.namespaceName) {}
+
+    const std::string& getNamespace() const override { return m_namespace; }
+
+    std::vector<core::InstanceValue> enumerateInstances(const std::string& className,
+                                                        const core::PropertyFilter& filter) override {
+        return call("EnumerateInstances", withFilter({{"ClassName", ClassName{className}}, kWhole}, filter))
+            .instances;
+    }
+    std::vector<core::CimPath> enumerateInstanceNames(const std::string& className) override {
+        return call("EnumerateInstanceNames", {{"ClassName", ClassName{className}}}).paths;
+    }
+    core::InstanceValue getInstance(const core::CimPath& path, const core::PropertyFilter& filter) override;
+
+    std::vector<core::InstanceValue> associators(const core::CimPath& path, const core::AssociationFilter& by,
+                                                 const core::PropertyFilter& filter) override {
+        return call("Associators", withFilter(associatorParameters(path, by), filter)).instances;
+    }
+    std::vector<core::CimPath> associatorNames(const core::CimPath& path,
+                                               const core::AssociationFilter& by) override {
+        return call("AssociatorNames", associatorParameters(path, by)).paths;
+    }
+    std::vector<core::InstanceValue> references(const core::CimPath& path, const core::AssociationFilter& by,
+                                                const core::PropertyFilter& filter) override {
+        return call("References", withFilter(referenceParameters(path, by), filter)).instances;
+    }
+    std::vector<core::CimPath> referenceNames(const core::CimPath& path,
+                                              const core::AssociationFilter& by) override {
+        return call("ReferenceNames", referenceParameters(path, by)).paths;
+    }
+
+    core::MethodResult invokeMethod(const core::CimPath& path, const std::string& method,
+                                    const std::vector<core::Argument>& arguments) override;
+    void deleteInstance(const core::CimPath& path) override {
+        call("DeleteInstance", {{"InstanceName", path}});
+    }
+    core::ClassChain getClass(const std::string& className) override;
+    std::vector<core::ClassChain> enumerateClasses(const std::string& className, bool deep) override;
+
+  private:
+    /// Inherited properties, too: servers leave them out by default (DSP0200 5.4.2.3).
+    static inline const cimxml::Parameter kWhole{"LocalOnly", std::string("FALSE")};
+
+    IntrinsicResult call(const std::string& operation, Parameters parameters);
+    std::vector<core::ClassChain> allClasses();
+    /// Some operations answer with host and namespace, some with neither: all paths read as those in process.
+    void complete(core::CimPath& path) const;
+    /// Sends the call; a CIM error in the answer is thrown as core::CimError.
+    cimxml::Response send(cimxml::Request request, const std::string& object);
+
+    HttpClient m_client;
+    std::string m_namespace;
+    unsigned m_messages = 0;
+};
+
+cimxml::Response RemoteOperations::send(cimxml::Request request, const std::string& object) {
+    request.messageId = std::to_string(++m_messages);
+    // Without the empty "Expect:", a large body waits a second for servers that do not answer it.
+    const HttpReply reply = m_client.post(
+        {"Content-Type: application/xml; charset=\"utf-8\"", "Expect:", "CIMProtocolVersion: 1.0",
+         "CIMOperation: MethodCall", "CIMMethod: " + percentEncoded(request.name()),
+         "CIMObject: " + percentEncoded(object)},
+        cimxml::writeRequest(request));
+    requireOk(reply);
+    try {
+        cimxml::Response response = cimxml::readResponse(reply.body);
+        if (const auto* error = std::get_if<cimxml::ErrorResult>(&response.content))
+            throw core::CimError(error->status, error->description);
+        return response;
+    } catch (const cimxml::WireError& error) {
+        throw CommandError(ExitStatus::Failed,
+                           std::string("The server's answer cannot be read: ") + error.what() + ".",
+                           "Check that --server names a CIM-XML server.");
+    }
+}
+
+IntrinsicResult RemoteOperations::call(const std::string& operation, Parameters parameters) {
+    cimxml::Request request;
+    request.call = cimxml::IntrinsicCall{operation, m_namespace, std::move(parameters)};
+    cimxml::Response response = send(std::move(request), m_namespace);
+    auto* result = std::get_if<IntrinsicResult>(&response.content);
+    if (result == nullptr) return {};
+    for (core::InstanceValue& instance : result->instances)
+        complete(instance.path);
+    for (core::CimPath& path : result->paths)
+        complete(path);
+    return std::move(*result);
+}
+
+void RemoteOperations::complete(core::CimPath& path) const {
+    if (!path.isValid()) return;
+    path.setHost("");
+    path.completeNamespace(m_namespace);
+}
+
+core::InstanceValue RemoteOperations::getInstance(const core::CimPath& path,
+                                                  const core::PropertyFilter& filter) {
+    auto instances = call("GetInstance", withFilter({{"InstanceName", path}, kWhole}, filter)).instances;
+    if (instances.empty()) throw core::CimError(core::CimStatus::NotFound, path.toString());
+    // The answer does not repeat the path.
+    instances.front().path = path;
+    return std::move(instances.front());
+}
+
+core::MethodResult RemoteOperations::invokeMethod(const core::CimPath& path, const std::string& method,
+                                                  const std::vector<core::Argument>& arguments) {
+    core::CimPath object = path;
+    object.completeNamespace(m_namespace);
+    cimxml::Request request;
+    request.call = cimxml::MethodCall{method, object, arguments};
+    cimxml::Response response = send(std::move(request), object.toString());
+    auto* result = std::get_if<core::MethodResult>(&response.content);
+    return result == nullptr ? core::MethodResult{} : std::move(*result);
+}
+
+/// A class comes without its superclasses, so all are fetched to build its chain.
+std::vector<core::ClassChain> RemoteOperations::allClasses() {
+    return core::chainsOf(call("EnumerateClasses",
+                               {{"DeepInheritance", std::string("TRUE")}, {"LocalOnly", std::string("TRUE")}})
+                              .classes);
+}
+
+core::ClassChain RemoteOperations::getClass(const std::string& className) {
+    for (core::ClassChain& chain : allClasses()) {
+        if (core::sameName(chain.front()->name, className)) return std::move(chain);
+    }
+    return {};
+}
+
+std::vector<core::ClassChain> RemoteOperations::enumerateClasses(const std::string& className, bool deep) {
+    std::vector<core::ClassChain> chains = allClasses();
+    const auto isIt = [&](const auto& chain) { return core::sameName(chain.front()->name, className); };
+    if (!className.empty() && std::none_of(chains.begin(), chains.end(), isIt))
+        throw core::CimError(core::CimStatus::InvalidClass, "There is no class " + className);
+    std::erase_if(chains, [&](const auto& chain) { return !core::isBelow(chain, className, deep); });
+    return chains;
+}
+
+/// The line that the user answers with. Throws CommandError with these texts where nobody can answer.
+std::string ask(const std::string& prompt, const std::string& missing, const std::string& advice) {
+    std::string line;
+    if (isatty(STDIN_FILENO) == 1) {
+        std::cerr << prompt << std::flush;
+        if (std::getline(std::cin, line) && !line.empty()) return line;
+        std::cerr << '\n';
+    }
+    throw CommandError(ExitStatus::WrongUse, missing, advice);
+}
+
+std::string userName() {
+    const char* given = std::getenv("QUENXCTL_USER");
+    if (given != nullptr && *given != '\0') return given;
+    return ask("User: ", "No user name was given.",
+               "Name the user with --user or the environment variable QUENXCTL_USER.");
+}
+
+std::string passwordOf(const std::string& user) {
+    const char* given = std::getenv("QUENXCTL_PASSWORD");
+    if (given != nullptr) return given;
+    const os::EchoOff silence;
+    std::string password =
+        ask("Password for " + user + ": ", "No password was given for " + user + ".",
+            "Put it into the environment variable QUENXCTL_PASSWORD, or type it on a terminal.");
+    std::cerr << '\n';  // the user's own was not echoed
+    return password;
+}
+
+}  // namespace
+
+Connection openServer(const ServerSettings& settings) {
+    if (!settings.url->isEncrypted() && !settings.url->isLoopback()) {
+        std::cerr << "quenxctl: WARNING: http:// sends the password and everything else unencrypted. Use "
+                     "https:// instead.\n";
+    }
+    if (settings.insecure) {
+        std::cerr << "quenxctl: WARNING: --insecure: the server's certificate is not checked. Anybody on the "
+                     "network path can read the password and pose as the server.\n";
+    }
+    const std::string user = settings.user.empty() ? userName() : settings.user;
+    const std::string password = passwordOf(user);
+    return {std::make_shared<RemoteOperations>(settings, user, password), false, settings.url->isLoopback()};
+}
+
+}  // namespace cli

@@ -1,0 +1,52 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include <stdexcept>
+#include <string>
+#include <string_view>
+#include <utility>
+#include <vector>
+
+namespace cli {
+
+/// What the program tells the script that called it; the help text documents them.
+enum class ExitStatus {
+    Done = 0,
+    Failed = 1,
+    WrongUse = 2,
+    AlreadyCurrent = 3,  ///< what was to be installed is what is installed
+    NotFound = 4,        ///< what the command line names is not there: an adapter, a job, an image file
+};
+
+/// What happened and what to do next, each one or two sentences. The advice may be empty.
+struct Explanation {
+    std::string message;
+    std::string advice;
+    ExitStatus status = ExitStatus::Failed;
+};
+
+/// The end of a verb that could not do its work.
+class CommandError : public std::runtime_error {
+  public:
+    CommandError(ExitStatus status, const std::string& message, std::string advice)
+        : std::runtime_error(message), m_status(status), m_advice(std::move(advice)) {}
+
+    ExitStatus status() const { return m_status; }
+    const std::string& advice() const { return m_advice; }
+
+  private:
+    ExitStatus m_status;
+    std::string m_advice;
+};
+
+/// Why a file could not be read: `error` is an errno. NotFound for one that is not there.
+Explanation cannotRead(const std::string& file, int error);
+
+/// "Did you mean eth0? " for a misspelt word: the one known word that it is nearest to, with a space for what
+/// follows. Empty when none is near, or when several are equally near.
+std::string didYouMean(std::string_view word, const std::vector<std::string>& known);
+
+/// "eth0, eth1, eth2"
+std::string joined(const std::vector<std::string>& words, std::string_view separator = ", ");
+
+}  // namespace cli

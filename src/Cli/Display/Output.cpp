@@ -1,0 +1,84 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "Cli/Display/Output.h"
+
+#include <algorithm>
+
+#include "Cli/Display/Messages.h"
+#include "Cli/Display/Terminal.h"
+#include "Utils/Utils.h"
+
+namespace cli {
+
+namespace {
+
+struct ScalarToJson {
+    Json operator()(const utils::Time& value) const { return core::datetimeText(value); }
+    template <class T>
+    Json operator()(const T& value) const {
+        return value;
+    }
+};
+
+std::string displayScalar(core::CimType type, const core::CimScalar& value) {
+    const std::string text = core::scalarText(type, value);
+    const bool isText = type == core::CimType::String || type == core::CimType::Char16;
+    return printable(isText ? utils::quoted(text) : text);
+}
+
+}  // namespace
+
+void printJson(std::ostream& out, const Json& document) {
+    out << document.dump(2, ' ', false, Json::error_handler_t::replace) << '\n';
+}
+
+void printTable(std::ostream& out, const std::vector<std::vector<std::string>>& rows) {
+    std::vector<std::size_t> widths;
+    for (const auto& row : rows) {
+        widths.resize(std::max(widths.size(), row.size()));
+        for (std::size_t i = 0; i < row.size(); ++i)
+            widths[i] = std::max(widths[i], columnsOf(printable(row[i])));
+    }
+    for (const auto& row : rows) {
+        for (std::size_t i = 0; i < row.size(); ++i) {
+            const std::string cell = printable(row[i]);
+            out << cell;
+            // Nothing follows the last cell, so no spaces either.
+            if (i + 1 < row.size()) out << std::string(widths[i] + 2 - columnsOf(cell), ' ');
+        }
+        out << '\n';
+    }
+}
+
+std::string displayText(const core::CimValue& value) {
+    if (const core::CimScalar* scalar = value.scalar()) return displayScalar(value.type, *scalar);
+    if (value.elements() == nullptr) return "NULL";
+    std::vector<std::string> texts;
+    for (const core::CimScalar& element : *value.elements())
+        texts.push_back(displayScalar(value.type, element));
+    return "{" + joined(texts) + "}";
+}
+
+}  // namespace cli
+
+namespace nlohmann {
+
+void adl_serializer<core::CimValue>::to_json(cli::Json& json, const core::CimValue& value) {
+    if (const core::CimScalar* scalar = value.scalar()) {
+        json = std::visit(cli::ScalarToJson(), *scalar);
+    } else if (const std::vector<core::CimScalar>* elements = value.elements()) {
+        json = cli::Json::array();
+        for (const core::CimScalar& element : *elements)
+            json.push_back(std::visit(cli::ScalarToJson(), element));
+    }
+}
+
+void adl_serializer<core::InstanceValue>::to_json(cli::Json& json, const core::InstanceValue& instance) {
+    cli::Json properties = cli::Json::object();
+    for (const core::PropertyValue& property : instance.properties)
+        properties[property.name] = property.value;
+    json = {{"path", instance.path},
+            {"class", instance.path.getClassName()},
+            {"properties", std::move(properties)}};
+}
+
+}  // namespace nlohmann

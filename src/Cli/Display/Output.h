@@ -1,0 +1,48 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include <nlohmann/json.hpp>
+#include <ostream>
+#include <string>
+#include <vector>
+
+#include "Framework/Requests/RequestValues.h"
+
+/// Results, as text for a person and as JSON for a script.
+namespace cli {
+
+/// Keeps its members in the order in which they are written here.
+using Json = nlohmann::ordered_json;
+
+/// One document and a line end. Bytes that are no UTF-8 are replaced: JSON has no place for them.
+void printJson(std::ostream& out, const Json& document);
+
+/// Prints rows with each column as wide as its widest cell; control characters in cells are made visible.
+void printTable(std::ostream& out, const std::vector<std::vector<std::string>>& rows);
+
+/// The value as one line for a person: strings in quotes, arrays in braces, "NULL".
+std::string displayText(const core::CimValue& value);
+
+}  // namespace cli
+
+// How the model's values become JSON. The library looks for this in its own namespace.
+namespace nlohmann {
+
+/// Numbers and booleans as such, all else as text, arrays as arrays. Integers are exact.
+template <>
+struct adl_serializer<core::CimValue> {
+    static void to_json(cli::Json& json, const core::CimValue& value);
+};
+
+template <>
+struct adl_serializer<core::CimPath> {
+    static void to_json(cli::Json& json, const core::CimPath& path) { json = path.toString(); }
+};
+
+/// {"path": ..., "class": ..., "properties": {...}}
+template <>
+struct adl_serializer<core::InstanceValue> {
+    static void to_json(cli::Json& json, const core::InstanceValue& instance);
+};
+
+}  // namespace nlohmann

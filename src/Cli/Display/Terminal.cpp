@@ -1,0 +1,101 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "Cli/Display/Terminal.h"
+
+#include <sys/ioctl.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <cstdlib>
+
+#include "Utils/Utils.h"
+
+namespace cli {
+
+namespace {
+
+constexpr const char* kClearLine = "\r\x1B[K";
+
+bool isSet(const char* variable) {
+    const char* value = std::getenv(variable);
+    return value != nullptr && *value != '\0';
+}
+
+/// Whether the byte belongs to the character before it.
+bool continues(char byte) {
+    return (static_cast<unsigned char>(byte) & 0xC0U) == 0x80U;
+}
+
+/// How many bytes the first characters take.
+std::size_t bytesOfFirst(std::string_view text, std::size_t characters) {
+    std::size_t bytes = 0;
+    for (; bytes < text.size(); ++bytes) {
+        if (!continues(text[bytes]) && characters-- == 0) break;
+    }
+    return bytes;
+}
+
+}  // namespace
+
+std::string printable(std::string_view text) {
+    std::string result;
+    result.reserve(text.size());
+    for (const char c : text) {
+        if (utils::isControl(c))
+            result += "\\x" + utils::hexByte(static_cast<unsigned char>(c));
+        else
+            result += c;
+    }
+    return result;
+}
+
+std::size_t columnsOf(std::string_view text) {
+    return static_cast<std::size_t>(
+        std::count_if(text.begin(), text.end(), [](char c) { return !continues(c); }));
+}
+
+std::string elideMiddle(std::string_view text, std::size_t width) {
+    constexpr std::string_view kMark = "...";
+    const std::size_t columns = columnsOf(text);
+    if (columns <= width) return std::string(text);
+    if (width <= kMark.size()) return std::string(kMark.substr(0, width));
+    const std::size_t kept = width - kMark.size();
+    const std::size_t tail = kept / 2;
+    return std::string(text.substr(0, bytesOfFirst(text, kept - tail))) + std::string(kMark) +
+           std::string(text.substr(bytesOfFirst(text, columns - tail)));
+}
+
+Terminal Terminal::of(int descriptor) {
+    const char* term = std::getenv("TERM");
+    const bool isDumb = term == nullptr || std::string_view(term) == "dumb";
+    return {isatty(descriptor) == 1 && !isDumb && !isSet("NO_COLOR"), descriptor};
+}
+
+std::size_t Terminal::width() const {
+    constexpr std::size_t kUsual = 80;
+    winsize size{};
+    if (descriptor < 0 || ioctl(descriptor, TIOCGWINSZ, &size) != 0 || size.ws_col == 0) return kUsual;
+    return size.ws_col;
+}
+
+std::size_t LinePrinter::width() const {
+    // Some terminals wrap as soon as the last column is written.
+    return m_terminal.width() - 1;
+}
+
+void LinePrinter::print(const std::string& line) {
+    if (!m_bottom.empty()) m_out << kClearLine;
+    m_out << line << '\n' << m_bottom << std::flush;
+}
+
+void LinePrinter::rewrite(const std::string& line) {
+    m_bottom = elideMiddle(line, width());
+    m_out << kClearLine << m_bottom << std::flush;
+}
+
+void LinePrinter::keep() {
+    if (m_bottom.empty()) return;
+    m_bottom.clear();
+    m_out << '\n' << std::flush;
+}
+
+}  // namespace cli

@@ -1,0 +1,62 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include <cstddef>
+#include <ostream>
+#include <string>
+#include <string_view>
+
+namespace cli {
+
+/// The text with control characters written as \xNN, so that a device's or a file's text cannot drive the
+/// terminal.
+std::string printable(std::string_view text);
+
+/// The columns that a UTF-8 text takes, each character one; bytes that are no UTF-8 count as one each.
+std::size_t columnsOf(std::string_view text);
+
+/// The text cut in the middle to at most `width` columns, "..." in the place of what is left out.
+std::string elideMiddle(std::string_view text, std::size_t width);
+
+/// What a file descriptor can show: asked once, when the program starts.
+struct Terminal {
+    /// True when a line can be written over: a terminal, unless TERM is "dumb" or NO_COLOR is set.
+    bool canRewrite = false;
+    /// Its width is asked for at each line, since people resize windows.
+    int descriptor = -1;
+
+    static Terminal of(int descriptor);
+    /// In columns; 80 when it cannot be had.
+    std::size_t width() const;
+};
+
+/// Puts lines on one terminal or into one file: lines that stay, and on a terminal one line at the bottom
+/// that is written over.
+class LinePrinter {
+  public:
+    LinePrinter(std::ostream& out, Terminal terminal) : m_out(out), m_terminal(terminal) {}
+    /// Leaves the bottom line where it is, with a line end behind it.
+    ~LinePrinter() { keep(); }
+    LinePrinter(const LinePrinter&) = delete;
+    LinePrinter& operator=(const LinePrinter&) = delete;
+
+    /// False for a pipe, a file or a dumb terminal: nothing can be written over there.
+    bool canRewrite() const { return m_terminal.canRewrite; }
+    /// The columns that rewrite() has.
+    std::size_t width() const;
+
+    /// A line that stays.
+    void print(const std::string& line);
+    /// The line at the bottom, in the place of the previous one, cut in the middle to the width. Only when
+    /// canRewrite().
+    void rewrite(const std::string& line);
+    /// Lets the bottom line stay.
+    void keep();
+
+  private:
+    std::ostream& m_out;
+    Terminal m_terminal;
+    std::string m_bottom;
+};
+
+}  // namespace cli

@@ -1,0 +1,65 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "Cli/Update/Candidate.h"
+
+#include <algorithm>
+
+#include "Cli/Connection/Properties.h"
+
+namespace cli {
+
+namespace {
+
+/// Throws CommandError for a type that the service's capabilities do not name. Any will do where they name
+/// none.
+void requireKnownTypes(core::CimOperations& operations, const std::vector<std::string>& types) {
+    const auto capabilities = operations.enumerateInstances("Quenx_SoftwareInstallationServiceCapabilities");
+    if (capabilities.empty()) return;
+    const std::vector<std::string> known = textsOf(capabilities.front(), "SupportedTargetTypes");
+    if (known.empty()) return;
+    for (const std::string& type : types) {
+        if (type.empty() || std::find(known.begin(), known.end(), type) != known.end()) continue;
+        throw CommandError(ExitStatus::WrongUse, "There is no image type \"" + type + "\".",
+                           didYouMean(type, known) + "The types are " + joined(known) + ".");
+    }
+}
+
+Candidate compared(const Connection& connection, Candidate candidate) {
+    const std::optional<std::string> path = localPath(candidate.uri);
+    if (!path || !connection.sharesFiles) return candidate;
+    candidate.image = readImage(*path);
+    if (!candidate.image->problem)
+        candidate.comparison = compare(candidate.image->rom, candidate.adapter, candidate.types);
+    return candidate;
+}
+
+}  // namespace
+
+bool Candidate::isAlreadyCurrent() const {
+    // An image for another card can have the same versions: the service is to refuse that one.
+    return comparison && comparison->current && comparison->foreignIds.empty() && comparison->isNetwork &&
+           comparison->missing.empty() && adapter.updatable;
+}
+
+Candidate makeCandidate(const Connection& connection, const ImageOptions& options) {
+    Adapter adapter = findAdapter(connection, options.target);
+    if (!options.identity.empty()) {
+        return makeCandidate(connection, std::move(adapter),
+                             findById(*connection.operations, options.identity), options.force);
+    }
+    requireKnownTypes(*connection.operations, options.types);
+    return compared(connection, {std::move(adapter),
+                                 imageUri(options.image),
+                                 {},
+                                 options.types,
+                                 options.force,
+                                 std::nullopt,
+                                 std::nullopt});
+}
+
+Candidate makeCandidate(const Connection& connection, Adapter adapter, const InventoryItem& image,
+                        bool force) {
+    return compared(connection, {std::move(adapter), image.uri(), image.path, image.types, force,
+                                 std::nullopt, std::nullopt});
+}
+
+}  // namespace cli

@@ -1,0 +1,133 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "Cli/Update/Jobs.h"
+
+#include <algorithm>
+#include <array>
+
+#include "Cli/Connection/Properties.h"
+#include "Cli/Display/Messages.h"
+#include "Cli/Display/Output.h"
+
+namespace cli {
+
+namespace {
+
+/// The path that an association has at one of its ends; null when there is none.
+const core::CimPath* endOf(const core::CimPath& association, std::string_view role) {
+    for (const core::CimKey& key : association.getKeys()) {
+        if (core::sameName(key.name, role)) return std::get_if<core::CimPath>(&key.value);
+    }
+    return nullptr;
+}
+
+/// A job does not tell its adapter; an association does.
+void nameAdapters(core::CimOperations& operations, std::vector<JobView>& jobs) {
+    const auto ports = operations.enumerateInstances("Quenx_EthernetPort");
+    for (const core::CimPath& affected : operations.enumerateInstanceNames("Quenx_AffectedJobElement")) {
+        const core::CimPath* element = endOf(affected, "AffectedElement");
+        const core::CimPath* affecting = endOf(affected, "AffectingElement");
+        if (element == nullptr || affecting == nullptr) continue;
+        const auto port = std::find_if(ports.begin(), ports.end(),
+                                       [&](const auto& each) { return each.path.isSameObjectAs(*element); });
+        const auto job = std::find_if(jobs.begin(), jobs.end(),
+                                      [&](const auto& each) { return each.path.isSameObjectAs(*affecting); });
+        // A job affects the card of its port, too; only the port is an adapter.
+        if (port != ports.end() && job != jobs.end()) job->adapter = textOf(*port, "Name");
+    }
+}
+
+JobView viewOf(const core::InstanceValue& job) {
+    return {job.path,
+            textOf(job, "InstanceID"),
+            "",
+            valueOf<utils::Time>(job, "StartTime"),
+            textOf(job, "Owner"),
+            static_cast<std::uint16_t>(numberOf(job, "JobState")),
+            static_cast<unsigned>(numberOf(job, "PercentComplete")),
+            static_cast<std::uint16_t>(numberOf(job, "ErrorCode")),
+            textOf(job, "ErrorDescription")};
+}
+
+JobView lookAt(core::CimOperations& operations, const core::CimPath& job, const Following& following) {
+    // A connection can break, and the update goes on all the same: so many looks in a row may fail.
+    constexpr unsigned kMostFailures = 20;
+    for (unsigned failures = 1;; ++failures) {
+        try {
+            return viewOf(operations.getInstance(job));
+        } catch (const CommandError& error) {
+            if (failures == kMostFailures) {
+                throw CommandError(
+                    error.status(), error.what(),
+                    "The update may still be running: \"quenxctl jobs\" shows it. If the server was "
+                    "restarted, \"quenxctl adapters\" shows which firmware is there.");
+            }
+        } catch (const core::CimError& error) {
+            if (error.status() != core::CimStatus::NotFound) throw;
+            throw CommandError(
+                ExitStatus::Failed,
+                "The server no longer knows the job: it was deleted, or the server was restarted. "
+                "How the update ends cannot be seen here.",
+                "\"quenxctl adapters\" shows which firmware is there.");
+        }
+        following.pause();
+    }
+}
+
+}  // namespace
+
+std::optional<unsigned> JobView::certainPercent() const {
+    constexpr unsigned kNotYet = 99;
+    if (hasSucceeded()) return 100;
+    return hasEnded() ? std::nullopt : std::optional(std::min(percent, kNotYet));
+}
+
+std::string JobView::stateName() const {
+    constexpr std::array<const char*, 13> kNames = {
+        "",          "",           "New",    "Starting",  "Running", "Suspended",    "Shutting Down",
+        "Completed", "Terminated", "Killed", "Exception", "Service", "Query Pending"};
+    const bool isKnown = state < kNames.size() && *kNames[state] != '\0';
+    return isKnown ? kNames[state] : "State " + std::to_string(state);
+}
+
+void to_json(Json& json, const JobView& job) {
+    const auto orNull = [](const std::string& text) { return text.empty() ? Json() : Json(text); };
+    json = {{"path", job.path},
+            {"id", job.id},
+            {"adapter", orNull(job.adapter)},
+            {"startTime", job.start ? Json(core::datetimeText(*job.start)) : Json()},
+            {"user", orNull(job.user)},
+            {"state", job.state},
+            {"stateName", job.stateName()},
+            {"percentComplete", job.percent},
+            {"errorCode", job.errorCode},
+            {"errorDescription", job.errorDescription}};
+}
+
+std::vector<JobView> readJobs(core::CimOperations& operations) {
+    std::vector<JobView> jobs;
+    for (const core::InstanceValue& job : operations.enumerateInstances("Quenx_ConcreteJob"))
+        jobs.push_back(viewOf(job));
+    if (!jobs.empty()) nameAdapters(operations, jobs);
+    return jobs;
+}
+
+JobView followJob(core::CimOperations& operations, const core::CimPath& job, ProgressDisplay& progress,
+                  const Following& following) {
+    unsigned shown = 0;
+    while (true) {
+        JobView view = lookAt(operations, job, following);
+        if (const auto percent = view.certainPercent()) {
+            // Progress that goes back, as after a retry on the device, would only puzzle.
+            shown = std::max(shown, *percent);
+            progress.progressed(shown);
+        }
+        if (view.hasEnded()) {
+            progress.ended();
+            return view;
+        }
+        if (following.interrupted()) progress.interrupted();
+        following.pause();
+    }
+}
+
+}  // namespace cli

@@ -1,0 +1,193 @@
+// SPDX-License-Identifier: Apache-2.0
+// Installing an image, and checking whether it could be installed.
+#include <algorithm>
+
+#include "Cli/Display/Output.h"
+#include "Cli/Update/Refusal.h"
+#include "Cli/Update/Service.h"
+#include "Cli/Verbs/Verbs.h"
+
+namespace cli {
+
+namespace {
+
+/// How an install, or a check of one, ended: the same facts for a person and for a script.
+struct Outcome {
+    explicit Outcome(const Candidate& candidate)
+        : adapter(candidate.adapter.name),
+          uri(candidate.uri),
+          before(candidate.adapter.components),
+          after(candidate.adapter.components) {}
+
+    void end(ExitStatus with, const std::string& how, const std::string& what) {
+        status = with;
+        result = how;
+        message = what;
+    }
+    void end(const std::string& how, const Explanation& why) {
+        end(why.status, how, why.message);
+        advice = why.advice;
+    }
+    /// For a person: not found is a failure, already current is none.
+    bool isFailure() const { return status == ExitStatus::Failed || status == ExitStatus::NotFound; }
+
+    ExitStatus status = ExitStatus::Failed;
+    std::string result;   ///< "updated", "installable", "already current", "refused", "failed"
+    std::string message;  ///< what happened
+    std::string advice;   ///< what to do next; may be empty
+    std::string adapter;
+    std::string uri;
+    std::optional<std::uint32_t> returnValue;  ///< of the method, when it was called
+    std::optional<JobView> job;                ///< when one was started
+    std::vector<Component> before;
+    std::vector<Component> after;  ///< empty when that could not be read
+};
+
+void to_json(Json& json, const Outcome& outcome) {
+    json = {{"result", outcome.result},   {"exitStatus", static_cast<int>(outcome.status)},
+            {"message", outcome.message}, {"advice", outcome.advice},
+            {"adapter", outcome.adapter}, {"uri", outcome.uri},
+            {"returnValue", nullptr},     {"job", nullptr},
+            {"before", outcome.before},   {"after", outcome.after}};
+    if (outcome.returnValue) json["returnValue"] = *outcome.returnValue;
+    if (outcome.job) json["job"] = *outcome.job;
+}
+
+/// "1 -> 2", "1 (unchanged)"
+std::string changeText(std::optional<std::uint32_t> before, std::optional<std::uint32_t> after) {
+    const auto text = [](std::optional<std::uint32_t> version) {
+        return version ? std::to_string(*version) : std::string("none");
+    };
+    return before == after ? text(after) + " (unchanged)" : text(before) + " -> " + text(after);
+}
+
+void printChange(std::ostream& out, const Outcome& outcome) {
+    std::vector<std::vector<std::string>> rows;
+    for (const Component& component : outcome.after) {
+        rows.push_back({"  " + component.type,
+                        changeText(versionOf(outcome.before, component.type), component.version)});
+    }
+    for (const Component& component : outcome.before) {
+        if (outcome.after.empty() || versionOf(outcome.after, component.type)) continue;
+        rows.push_back({"  " + component.type, changeText(component.version, std::nullopt)});
+    }
+    printTable(out, rows);
+}
+
+ExitStatus print(Context& context, const Outcome& outcome) {
+    if (context.json) {
+        printJson(context.out, outcome);
+        return outcome.status;
+    }
+    std::ostream& stream = outcome.isFailure() ? context.error : context.out;
+    stream << (outcome.isFailure() ? "quenxctl: " : "") << printable(outcome.message) << '\n';
+    if (outcome.job && !outcome.isFailure()) printChange(stream, outcome);
+    if (!outcome.advice.empty()) stream << printable(outcome.advice) << '\n';
+    return outcome.status;
+}
+
+void endAsCurrent(Outcome& outcome, const Candidate& candidate) {
+    outcome.end(ExitStatus::AlreadyCurrent, "already current",
+                outcome.adapter + " is already current: it has " +
+                    componentsText(candidate.comparison->chosen) + ".");
+}
+
+/// An update that says it completed and left the old versions has not.
+bool isInPlace(const Candidate& candidate, const std::vector<Component>& after) {
+    if (!candidate.comparison || after.empty()) return true;
+    const std::vector<Component>& chosen = candidate.comparison->chosen;
+    return std::all_of(chosen.begin(), chosen.end(), [&](const Component& component) {
+        return std::find(after.begin(), after.end(), component) != after.end();
+    });
+}
+
+void judgeJob(const Connection& connection, Outcome& outcome, const Candidate& candidate) {
+    const std::string& name = outcome.adapter;
+    if (!outcome.job->hasSucceeded()) {
+        outcome.end("failed", explainFailedJob(connection, *outcome.job, candidate, outcome.after));
+    } else if (!isInPlace(candidate, outcome.after)) {
+        outcome.end("failed", {"The update of " + name + " ended without an error, but " + name + " has " +
+                                   componentsText(outcome.after) + ", not what the image has.",
+                               "Look into the system log, then install again with --force."});
+    } else {
+        const bool wasCurrent = candidate.comparison && candidate.comparison->current;
+        outcome.end(ExitStatus::Done, "updated",
+                    name + (wasCurrent ? " was rewritten with the same version." : " was updated."));
+        if (outcome.after.empty() && !outcome.before.empty())
+            outcome.advice = "Its versions cannot be read now; \"quenxctl adapters\" shows them later.";
+    }
+}
+
+/// What the adapter carries after the update. Nothing where that cannot be read: the job's end is worth
+/// reporting all the same.
+std::vector<Component> readBack(core::CimOperations& operations, const Candidate& candidate) {
+    try {
+        return readComponents(operations, candidate.adapter.path);
+    } catch (const CommandError&) {
+        return {};
+    } catch (const core::CimError&) {
+        return {};
+    }
+}
+
+void followUpdate(Context& context, const core::CimPath& job, const Candidate& candidate, Outcome& outcome) {
+    core::CimOperations& operations = *context.connection.operations;
+    context.progress.started(outcome.adapter, candidate.comparison ? candidate.comparison->bytes : 0);
+    outcome.job = followJob(operations, job, context.progress, context.following);
+    outcome.job->adapter = outcome.adapter;
+    outcome.after = readBack(operations, candidate);
+    judgeJob(context.connection, outcome, candidate);
+}
+
+}  // namespace
+
+ExitStatus install(Context& context, const VerbOptions& options) {
+    const Candidate candidate = makeCandidate(context.connection, options.image);
+    Outcome outcome(candidate);
+    if (!candidate.force && candidate.isAlreadyCurrent()) {
+        endAsCurrent(outcome, candidate);
+        outcome.advice = "Use --force to write it again.";
+        return print(context, outcome);
+    }
+    // The last moment to stop: nobody can once the service has been called.
+    if (context.following.interrupted())
+        throw CommandError(ExitStatus::Failed, "Interrupted before the update began: nothing was changed.",
+                           "");
+    const core::MethodResult result = startUpdate(*context.connection.operations, candidate);
+    outcome.returnValue = result.returnValue;
+    if (result.returnValue == MethodReturn::JobStarted) {
+        followUpdate(context, jobOf(result), candidate, outcome);
+    } else {
+        outcome.end("refused", explainRefusal(context.connection, result.returnValue, candidate));
+    }
+    return print(context, outcome);
+}
+
+ExitStatus check(Context& context, const VerbOptions& options) {
+    const Connection& connection = context.connection;
+    Candidate candidate = makeCandidate(connection, options.image);
+    std::optional<std::uint32_t> returnValue = verifyOnly(connection, candidate);
+    if (!returnValue) {
+        if (options.image.force || !options.image.types.empty()) {
+            throw CommandError(ExitStatus::WrongUse, "A check on a server takes neither --types nor --force.",
+                               "Leave them out, or check without --server.");
+        }
+        candidate = makeCandidate(connection, std::move(candidate.adapter),
+                                  findByFile(*connection.operations, options.image.image), false);
+        returnValue = verifyOnly(connection, candidate);
+    }
+    Outcome outcome(candidate);
+    outcome.returnValue = returnValue;
+    outcome.advice = adviceAfterCheck(connection, outcome.adapter);
+    if (returnValue != MethodReturn::Completed) {
+        outcome.end("refused", explainRefusal(connection, *returnValue, candidate));
+    } else if (!candidate.force && candidate.isAlreadyCurrent()) {
+        endAsCurrent(outcome, candidate);
+    } else {
+        outcome.end(ExitStatus::Done, "installable",
+                    "The image can be installed on " + outcome.adapter + ".");
+    }
+    return print(context, outcome);
+}
+
+}  // namespace cli

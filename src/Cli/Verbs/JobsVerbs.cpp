@@ -1,0 +1,94 @@
+// SPDX-License-Identifier: Apache-2.0
+// The jobs of a server.
+#include <algorithm>
+#include <array>
+#include <ctime>
+
+#include "Cli/Display/Output.h"
+#include "Cli/Verbs/Verbs.h"
+
+namespace cli {
+
+namespace {
+
+/// Jobs live as long as the process that runs them: this one has none that somebody else could have started.
+std::vector<JobView> jobsOfServer(const Connection& connection) {
+    if (!connection.runsJobs) return readJobs(*connection.operations);
+    throw CommandError(
+        ExitStatus::WrongUse,
+        "Jobs are kept by a server, and none was named: an update in this program ends with it.",
+        "Name the server with --server.");
+}
+
+std::string orDash(const std::string& text) {
+    return text.empty() ? "-" : text;
+}
+
+/// "2026-11-21 20:10:33" in the local time zone; "-" for none.
+std::string startText(const JobView& job) {
+    if (!job.start || job.start->isPeriod()) return "-";
+    const auto seconds = static_cast<std::time_t>(job.start->getSeconds());
+    std::tm local{};
+    std::array<char, sizeof "9999-12-31 23:59:59"> text{};
+    if (localtime_r(&seconds, &local) == nullptr) return "-";
+    return {text.data(), std::strftime(text.data(), text.size(), "%Y-%m-%d %H:%M:%S", &local)};
+}
+
+/// The users have a column where the service tells of one at least.
+void printJobs(std::ostream& out, const std::vector<JobView>& jobs) {
+    const bool hasUsers =
+        std::any_of(jobs.begin(), jobs.end(), [](const JobView& job) { return !job.user.empty(); });
+    std::vector<std::vector<std::string>> rows = {{"JOB", "ADAPTER", "STATE", "PERCENT", "START"}};
+    for (const JobView& job : jobs) {
+        const std::optional<unsigned> percent = job.certainPercent();
+        rows.push_back({job.id, orDash(job.adapter), job.stateName(),
+                        percent ? std::to_string(*percent) : "-", startText(job)});
+    }
+    for (std::size_t i = 0; i < rows.size(); ++i) {
+        if (hasUsers) rows[i].push_back(i == 0 ? "USER" : orDash(jobs[i - 1].user));
+        rows[i].push_back(i == 0 ? "ERROR" : jobs[i - 1].errorDescription);
+    }
+    printTable(out, rows);
+}
+
+bool isMeant(const JobView& job, const std::string& name) {
+    return job.id == name || job.path.toString() == name || job.id.ends_with("@Job#" + name);
+}
+
+void printDeleted(Context& context, const JobView& job) {
+    if (context.json) {
+        printJson(context.out, {{"deleted", job.id}, {"updateGoesOn", !job.hasEnded()}});
+        return;
+    }
+    context.out << "Deleted " << job.id << ".\n";
+    if (!job.hasEnded()) {
+        context.out
+            << "Its update continues, but can no longer be followed; until it ends, the server refuses "
+               "other updates.\n\"quenxctl adapters\" shows the firmware afterwards.\n";
+    }
+}
+
+}  // namespace
+
+ExitStatus showJobs(Context& context, const VerbOptions&) {
+    const std::vector<JobView> jobs = jobsOfServer(context.connection);
+    if (context.json) {
+        printJson(context.out, {{"jobs", jobs}});
+    } else {
+        printJobs(context.out, jobs);
+    }
+    return ExitStatus::Done;
+}
+
+ExitStatus deleteJob(Context& context, const VerbOptions& options) {
+    for (const JobView& job : jobsOfServer(context.connection)) {
+        if (!isMeant(job, options.job)) continue;
+        context.connection.operations->deleteInstance(job.path);
+        printDeleted(context, job);
+        return ExitStatus::Done;
+    }
+    throw CommandError(ExitStatus::NotFound, "There is no job \"" + options.job + "\".",
+                       "\"quenxctl jobs\" lists the jobs.");
+}
+
+}  // namespace cli

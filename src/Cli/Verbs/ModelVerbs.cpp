@@ -1,0 +1,70 @@
+// SPDX-License-Identifier: Apache-2.0
+// The model as it is: instances and their associations.
+#include "Cli/Display/Output.h"
+#include "Cli/Verbs/Verbs.h"
+
+namespace cli {
+
+namespace {
+
+/// Text: the path, then one indented line for each property that is not null.
+ExitStatus print(Context& context, const std::vector<core::InstanceValue>& instances) {
+    if (context.json) {
+        printJson(context.out, {{"instances", instances}});
+        return ExitStatus::Done;
+    }
+    for (const core::InstanceValue& instance : instances) {
+        context.out << printable(instance.path.toString()) << '\n';
+        for (const core::PropertyValue& property : instance.properties) {
+            if (property.value.isNull()) continue;
+            context.out << "    " << property.name << " = " << displayText(property.value) << '\n';
+        }
+    }
+    return ExitStatus::Done;
+}
+
+ExitStatus print(Context& context, const std::vector<core::CimPath>& paths) {
+    if (context.json) {
+        printJson(context.out, {{"paths", paths}});
+        return ExitStatus::Done;
+    }
+    for (const core::CimPath& path : paths)
+        context.out << printable(path.toString()) << '\n';
+    return ExitStatus::Done;
+}
+
+/// None where a server does not list them.
+std::vector<std::string> servedClasses(core::CimOperations& operations) try {
+    std::vector<std::string> names;
+    for (const core::ClassChain& chain : operations.enumerateClasses("", true))
+        names.push_back(chain.front()->name);
+    return names;
+} catch (const core::CimError&) {
+    return {};
+}
+
+}  // namespace
+
+ExitStatus showInstances(Context& context, const VerbOptions& options) try {
+    core::CimOperations& operations = *context.connection.operations;
+    return options.namesOnly ? print(context, operations.enumerateInstanceNames(options.className))
+                             : print(context, operations.enumerateInstances(options.className));
+} catch (const core::CimError& error) {
+    if (error.status() != core::CimStatus::InvalidClass) throw;
+    throw CommandError(
+        ExitStatus::NotFound, "No class \"" + options.className + "\" is served.",
+        didYouMean(options.className, servedClasses(*context.connection.operations)) + kAskMof);
+}
+
+ExitStatus showAssociators(Context& context, const VerbOptions& options) {
+    core::CimOperations& operations = *context.connection.operations;
+    const core::CimPath path(options.path);
+    if (!path.isInstancePath()) {
+        throw CommandError(ExitStatus::WrongUse, "\"" + options.path + "\" is not the path of an instance.",
+                           "Give one as \"quenxctl instances CLASS --names\" prints it, in single quotes.");
+    }
+    return options.namesOnly ? print(context, operations.associatorNames(path, options.filter))
+                             : print(context, operations.associators(path, options.filter));
+}
+
+}  // namespace cli

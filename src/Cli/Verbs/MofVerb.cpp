@@ -1,0 +1,143 @@
+// SPDX-License-Identifier: Apache-2.0
+#include <algorithm>
+#include <map>
+
+#include "Cli/Display/Output.h"
+#include "Cli/Verbs/Verbs.h"
+#include "Utils/Utils.h"
+
+namespace cli {
+
+namespace {
+
+std::string literal(core::CimType type, const core::CimScalar& value) {
+    const auto* text = std::get_if<std::string>(&value);
+    return text != nullptr ? utils::quoted(*text) : core::foldName(core::scalarText(type, value));
+}
+
+std::string literal(const core::CimValue& value) {
+    if (const core::CimScalar* scalar = value.scalar()) return literal(value.type, *scalar);
+    if (value.elements() == nullptr) return "null";
+    std::vector<std::string> items;
+    for (const core::CimScalar& element : *value.elements())
+        items.push_back(literal(value.type, element));
+    return "{ " + joined(items, ", ") + " }";
+}
+
+std::string qualifierText(const core::Qualifier& qualifier) {
+    const std::string value = literal(qualifier.value);
+    if (value == "true") return qualifier.name;  // a flag is set by its name alone
+    return qualifier.name + (qualifier.value.isArray ? " " + value : " ( " + value + " )");
+}
+
+std::string qualifierList(const std::vector<core::Qualifier>& qualifiers, const std::string& indent) {
+    std::vector<std::string> texts;
+    for (const core::Qualifier& qualifier : qualifiers) {
+        if (!qualifier.isPropagated) texts.push_back(qualifierText(qualifier));
+    }
+    if (texts.empty()) return {};
+    return indent + "[ " + joined(texts, ",\n" + indent + "   ") + " ]\n";
+}
+
+std::string declarationText(const core::QualifierDeclaration& declaration) {
+    std::vector<std::string> scopes;
+    for (const std::string_view scope : declaration.scopes)
+        scopes.push_back(core::foldName(scope));
+    std::string text = "Qualifier " + declaration.name + " : ";
+    text += core::typeName(declaration.defaultValue.type);
+    text += declaration.defaultValue.isArray ? "[] = " : " = ";
+    text += literal(declaration.defaultValue) + ",\n    Scope(";
+    text += declaration.scopes == core::qualifierScopes() ? "any" : joined(scopes, ", ");
+    text += "),\n    Flavor(";
+    text += declaration.isOverridable ? "EnableOverride, " : "DisableOverride, ";
+    text += declaration.isInherited ? "ToSubclass" : "Restricted";
+    text += declaration.isTranslatable ? ", Translatable);\n" : ");\n";
+    return text;
+}
+
+/// "TYPE Name[]" of a property or parameter, behind its qualifiers.
+template <class Declaration>
+std::string elementText(const Declaration& element, const std::string& indent) {
+    std::string type(core::typeName(element.type));
+    if (element.type == core::CimType::Reference) type = element.referenceClass + " REF";
+    return qualifierList(element.qualifiers, indent) + indent + type + " " + element.name +
+           (element.isArray ? "[]" : "");
+}
+
+std::string methodText(const core::MethodDeclaration& method) {
+    const std::string indent(4, ' ');
+    std::vector<std::string> parameters;
+    for (const core::ParameterDeclaration& parameter : method.parameters)
+        parameters.push_back(elementText(parameter, std::string(8, ' ')));
+    return qualifierList(method.qualifiers, indent) + indent +
+           std::string(core::typeName(method.returnType)) + " " + method.name + "(\n" +
+           joined(parameters, ",\n") + ");\n";
+}
+
+std::string classText(const core::ClassDeclaration& declaration) {
+    std::string text = qualifierList(declaration.qualifiers, "") + "class " + declaration.name;
+    if (!declaration.superclass.empty()) text += " : " + declaration.superclass;
+    text += " {\n";
+    for (const core::PropertyDeclaration& property : declaration.properties)
+        text += elementText(property, std::string(4, ' ')) + ";\n";
+    for (const core::MethodDeclaration& method : declaration.methods)
+        text += methodText(method);
+    return text + "};\n";
+}
+
+using Waiting = std::map<std::string, const core::ClassDeclaration*>;
+
+bool isDone(const Waiting& waiting, const std::string& name, const core::ClassDeclaration& user) {
+    return core::sameName(name, user.name) || !waiting.contains(core::foldName(name));
+}
+
+bool refersToDone(const Waiting& waiting, const core::ClassDeclaration& declaration) {
+    const auto isReady = [&](const auto& element) {
+        return isDone(waiting, element.referenceClass, declaration);
+    };
+    return std::all_of(declaration.properties.begin(), declaration.properties.end(), isReady) &&
+           std::all_of(declaration.methods.begin(), declaration.methods.end(), [&](const auto& method) {
+               return std::all_of(method.parameters.begin(), method.parameters.end(), isReady);
+           });
+}
+
+/// The next class to write, the first by name of those that can be. Where classes refer to each other in a
+/// circle, a reference has to point forward; a superclass never may.
+Waiting::const_iterator nextClass(const Waiting& waiting) {
+    auto best = waiting.end();
+    for (auto each = waiting.begin(); each != waiting.end(); ++each) {
+        if (!isDone(waiting, each->second->superclass, *each->second)) continue;
+        if (refersToDone(waiting, *each->second)) return each;
+        if (best == waiting.end()) best = each;
+    }
+    return best == waiting.end() ? waiting.begin() : best;
+}
+
+std::string mofText(const std::vector<core::ClassChain>& classes) {
+    std::string text;
+    for (const core::QualifierDeclaration& declaration : core::qualifierDeclarations())
+        text += declarationText(declaration);
+    Waiting waiting;
+    for (const core::ClassChain& chain : classes)
+        waiting[core::foldName(chain.front()->name)] = chain.front().get();
+    while (!waiting.empty()) {
+        const auto next = nextClass(waiting);
+        text += "\n" + classText(*next->second);
+        waiting.erase(next);
+    }
+    return text;
+}
+
+}  // namespace
+
+ExitStatus showMof(Context& context, const VerbOptions&) {
+    const std::string text = mofText(context.connection.operations->enumerateClasses("", true));
+    if (context.json) {
+        printJson(context.out, {{"mof", text}});
+    } else {
+        context.out << text;
+    }
+    return ExitStatus::Done;
+}
+
+}  // namespace cli

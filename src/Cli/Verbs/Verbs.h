@@ -1,0 +1,60 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include <ostream>
+#include <string>
+
+#include "Cli/Connection/Connection.h"
+#include "Cli/Display/Messages.h"
+#include "Cli/Display/Progress.h"
+#include "Cli/Update/Candidate.h"
+#include "Cli/Update/Jobs.h"
+
+/// The verbs of the program. Each prints its result, as text or as one JSON document; what keeps it from its
+/// work is thrown as CommandError or core::CimError.
+namespace cli {
+
+/// What every verb works with.
+struct Context {
+    const Connection& connection;
+    std::ostream& out;    ///< results
+    std::ostream& error;  ///< what went wrong
+    bool json = false;    ///< results, failures included, as one JSON document
+    ProgressDisplay& progress;
+    Following following;
+};
+
+/// What the command line says beside the verb; each verb looks at what it has options for.
+struct VerbOptions {
+    ImageOptions image;              ///< install, check
+    std::string job;                 ///< delete: its id, the number at the end of that, or its path
+    std::string className;           ///< instances
+    std::string path;                ///< associators
+    core::AssociationFilter filter;  ///< associators
+    bool namesOnly = false;          ///< instances, associators
+};
+
+using Verb = ExitStatus (*)(Context& context, const VerbOptions& options);
+
+ExitStatus showAdapters(Context& context, const VerbOptions& options);
+ExitStatus showIdentities(Context& context, const VerbOptions& options);
+
+ExitStatus install(Context& context, const VerbOptions& options);
+/// On a server only an image that the inventory offers, with neither types nor force.
+ExitStatus check(Context& context, const VerbOptions& options);
+
+/// Both need a server: jobs of this program's own end with it.
+ExitStatus showJobs(Context& context, const VerbOptions& options);
+ExitStatus deleteJob(Context& context, const VerbOptions& options);
+
+ExitStatus showInstances(Context& context, const VerbOptions& options);
+ExitStatus showAssociators(Context& context, const VerbOptions& options);
+/// The classes as MOF (DSP0004 annex A) in an order that a compiler takes: the declarations of the qualifiers
+/// first, then each class after its superclass and after the classes that it refers to, as far as those do
+/// not refer to each other.
+ExitStatus showMof(Context& context, const VerbOptions& options);
+
+/// What to do about a class that is not served.
+inline constexpr const char* kAskMof = "\"quenxctl mof\" prints the classes that are served.";
+
+}  // namespace cli

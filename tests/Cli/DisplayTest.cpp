@@ -1,0 +1,106 @@
+// SPDX-License-Identifier: Apache-2.0
+#include <gtest/gtest.h>
+
+#include <filesystem>
+#include <sstream>
+
+#include "Cli/Display/Output.h"
+#include "Cli/Display/Progress.h"
+#include "Cli/Update/Image.h"
+
+namespace {
+
+using core::CimType;
+using core::CimValue;
+using std::chrono::milliseconds;
+using std::chrono::seconds;
+
+TEST(ImageUriTest, LeavesUrisAloneAndEncodesNothing) {
+    const std::string here = std::filesystem::current_path().string();
+    const struct {
+        const char* image;
+        std::string uri;
+    } rows[] = {
+        {"/a b%20c:d::e", "file:///a b%20c:d::e"},
+        {"x.rom", "file://" + here + "/x.rom"},
+        {"a:b.rom", "file://" + here + "/a:b.rom"},
+        {"FILE:///x", "FILE:///x"},
+        {"file:/x", "file:/x"},
+        {"://x", "file://" + here + "/://x"},
+    };
+    for (const auto& row : rows)
+        EXPECT_EQ(cli::imageUri(row.image), row.uri);
+    EXPECT_EQ(cli::localPath("FILE:///a::b"), "/a::b");
+}
+
+TEST(OutputTest, WritesValuesAsTextAndAsJson) {
+    const struct {
+        CimValue value;
+        std::string text;
+        std::string json;
+    } rows[] = {
+        {CimValue::null(CimType::String), "NULL", "null"},
+        {CimValue::of(CimType::Boolean, true), "TRUE", "true"},
+        {CimValue::of(CimType::Uint64, std::uint64_t{18446744073709551615U}), "18446744073709551615",
+         "18446744073709551615"},
+        {CimValue::of(CimType::Sint8, std::int64_t{-5}), "-5", "-5"},
+        {CimValue::of(CimType::String, std::string("a\"\\\n")), "\"a\\\"\\\\\\x0a\"", "\"a\\\"\\\\\\n\""},
+        {CimValue::arrayOf(CimType::Uint16, {std::uint64_t{5}, std::uint64_t{3}}), "{5, 3}", "[5,3]"},
+        {CimValue::arrayOf(CimType::String, {}), "{}", "[]"},
+    };
+    for (const auto& row : rows) {
+        EXPECT_EQ(cli::displayText(row.value), row.text);
+        EXPECT_EQ(cli::Json(row.value).dump(), row.json);
+    }
+    std::ostringstream out;
+    cli::printJson(out, {{"name", "no text \xff"}});
+    EXPECT_EQ(cli::Json::parse(out.str())["name"], "no text \xEF\xBF\xBD");
+}
+
+TEST(OutputTest, CutsAlignsAndDisarmsText) {
+    EXPECT_EQ(cli::elideMiddle("abcdefghij", 10), "abcdefghij");
+    EXPECT_EQ(cli::elideMiddle("abcdefghij", 8), "abc...ij");
+    EXPECT_EQ(cli::elideMiddle("abcdefghij", 2), "..");
+    EXPECT_EQ(cli::elideMiddle("äöüäöüäöüä", 8), "äöü...üä");
+    std::ostringstream out;
+    cli::printTable(out, {{"A", "B"}, {"long\n\x1b", "x"}, {"größe", "y"}, {"", ""}});
+    EXPECT_EQ(out.str(), "A             B\nlong\\x0a\\x1b  x\ngröße         y\n              \n");
+}
+
+TEST(ProgressTest, FitsTheWidthAndSaysNoMoreThanItKnows) {
+    const cli::UpdateProgress half{"eth0", 50, 256000, milliseconds(2000), 10};
+    EXPECT_EQ(cli::barText(half, 80),
+              "eth0  [=========>         ]  50 %  125.0 KiB of 250.0 KiB  50.0 KiB/s  0:03 left");
+    EXPECT_EQ(cli::barText(half, 40), "eth0  [=============>            ]  50 %");
+    EXPECT_EQ(cli::barText(half, 12), "eth0   50 %");
+    for (std::size_t width = 20; width < 120; ++width)
+        EXPECT_LE(cli::barText(half, width).size(), width);
+    EXPECT_EQ(cli::lineText(half), "eth0: 50 %, 125.0 KiB of 250.0 KiB, 50.0 KiB/s, 0:03 left");
+    EXPECT_EQ(cli::lineText({"eth0", 10, 0, milliseconds(5000), 10}), "eth0: 10 %");
+    EXPECT_EQ(cli::lineText({"eth0", 20, 0, milliseconds(5000), 10}), "eth0: 20 %, 0:40 left");
+    EXPECT_EQ(cli::lineText({"eth0", 100, 1023, milliseconds(5000), 10}), "eth0: 100 %, 1023 B of 1023 B");
+    EXPECT_EQ(cli::byteText(std::uint64_t{5} << 40), "5.0 TiB");
+    EXPECT_EQ(cli::durationText(seconds(3723)), "1:02:03");
+}
+
+/// What a display puts out that is no terminal, told of these percentages, a second apart.
+std::string show(const std::vector<unsigned>& percentages) {
+    std::ostringstream out;
+    cli::LinePrinter printer(out, {});
+    std::chrono::steady_clock::time_point now{};
+    cli::ProgressDisplay display(printer, [&] { return now; });
+    display.started("eth0", 0);
+    for (const unsigned percent : percentages) {
+        display.progressed(percent);
+        now += seconds(1);
+    }
+    display.ended();
+    return out.str();
+}
+
+TEST(ProgressTest, WritesPlainLinesAndIsNotSilentWhenNothingMoves) {
+    EXPECT_EQ(show({20, 20, 55, 100}), "eth0: 0 %\neth0: 20 %\neth0: 55 %, 0:03 left\neth0: 100 %\n");
+    EXPECT_EQ(show(std::vector<unsigned>(25, 3)), "eth0: 0 %\neth0: 3 %\neth0: 3 %\n");
+}
+
+}  // namespace

@@ -1,0 +1,155 @@
+// SPDX-License-Identifier: Apache-2.0
+#include <signal.h>
+
+#include <chrono>
+#include <thread>
+
+#include "System/HeldFlash.h"
+#include "System/Quenxctl.h"
+
+namespace {
+
+using test::contains;
+using test::HeldFlash;
+using test::Program;
+using test::ProgramResult;
+
+constexpr const char* kOld = "IMG_PXE 1, IMG_UEFI 0";
+constexpr const char* kNew = "IMG_PXE 2, IMG_UEFI 2";
+const std::string kInstall = "install --target eth0 IMAGE";
+
+class InstallTest : public test::Quenxctl {
+  protected:
+    std::string m_flash = m_folder / "adapters.state/eth0";
+};
+
+TEST_F(InstallTest, WritesTheImageAndSaysWhatChanged) {
+    EXPECT_EQ(firmwareOf("eth0"), kOld);
+    const ProgramResult result = quenxctl(kInstall);
+    EXPECT_EQ(result.status, 0) << result.error;
+    EXPECT_TRUE(result.out.ends_with("eth0 was updated.\n  IMG_PXE   1 -> 2\n  IMG_UEFI  0 -> 2\n"))
+        << result.out;
+    EXPECT_EQ(result.error, "");
+    const std::string table = quenxctl("adapters").out;
+    EXPECT_TRUE(
+        table.starts_with("NAME  PCI      IDS        UPDATABLE  FIRMWARE                 DESCRIPTION\n"
+                          "eth0  03:00.0  1af4:1041  yes        IMG_PXE 2, IMG_UEFI 2    \n"
+                          "eth1  03:00.1  1af4:1041  yes        IMG_PXE 1, IMG_UEFI 0    \n"
+                          "eth2  04:00.0  10ec:8139  yes        IMG_PXE 1, IMG_UEFI 0    \n"
+                          "eth3  05:00.0  1022:2000  no         IMG_PXE 1                \n"))
+        << table;
+
+    for (const char* address : {"03:00.0", "0000:03:00.0"}) {
+        const ProgramResult again = quenxctl("install --target " + std::string(address) + " IMAGE");
+        EXPECT_EQ(again.status, 3);
+        EXPECT_EQ(again.out,
+                  "eth0 is already current: it has IMG_PXE 2, IMG_UEFI 2.\nUse --force to write it again.\n");
+    }
+    const ProgramResult forced = quenxctl("update --target eth0 IMAGE --force");
+    EXPECT_TRUE(
+        forced.out.ends_with("eth0 was rewritten with the same version.\n"
+                             "  IMG_PXE   2 (unchanged)\n  IMG_UEFI  2 (unchanged)\n"))
+        << forced.out;
+}
+
+TEST_F(InstallTest, InstallsTheTypesAskedForOnly) {
+    EXPECT_EQ(quenxctl(kInstall + " --types IMG_UEFI").status, 0);
+    EXPECT_EQ(firmwareOf("eth0"), "IMG_PXE 1, IMG_UEFI 2");
+    EXPECT_EQ(quenxctl(kInstall + " --types IMG_UEFI").status, 3);
+    EXPECT_EQ(quenxctl(kInstall + " --types IMG_PXE,IMG_UEFI").status, 0);
+    EXPECT_EQ(firmwareOf("eth0"), kNew);
+}
+
+TEST_F(InstallTest, SaysAFailureInTheAdaptersWords) {
+    describeAdapters("action = \"fail\"\ncode = 6\ntext = \"erase failed\\u001b[2J\"");
+    const ProgramResult result = quenxctl(kInstall);
+    EXPECT_EQ(result.status, 1);
+    EXPECT_EQ(result.error,
+              "quenxctl: The update of eth0 failed: erase failed\\x1b[2J (error 6).\n"
+              "It keeps its old firmware.\n");
+    EXPECT_EQ(firmwareOf("eth0"), kOld);
+}
+
+TEST_F(InstallTest, ShowsABarOnATerminalOnly) {
+    const struct {
+        Program::Output output;
+        std::vector<std::string> environment;
+        bool hasBar;
+    } rows[] = {
+        {Program::Output::Terminal, {"TERM=xterm", "NO_COLOR"}, true},
+        {Program::Output::Terminal, {"TERM=dumb", "NO_COLOR"}, false},
+        {Program::Output::Terminal, {"TERM=xterm", "NO_COLOR=1"}, false},
+        {Program::Output::Pipes, {"TERM=xterm", "NO_COLOR"}, false},
+    };
+    for (const auto& row : rows) {
+        const ProgramResult result =
+            Program(command(kInstall + " --force"), row.output, row.environment).finish();
+        EXPECT_EQ(result.status, 0) << result.out;
+        EXPECT_EQ(contains(result.out, "\x1B["), row.hasBar) << result.out;
+        EXPECT_EQ(contains(result.out, "eth0  ["), row.hasBar) << result.out;
+        EXPECT_EQ(contains(result.out, "eth0: 0 %"), !row.hasBar) << result.out;
+        EXPECT_TRUE(contains(result.out, "100 %")) << result.out;
+    }
+}
+
+#if defined(__has_feature)
+#if __has_feature(thread_sanitizer)
+#define QUENX_THREAD_SANITIZER 1
+#endif
+#endif
+#ifdef QUENX_THREAD_SANITIZER
+constexpr int kCtrlCs = 6;
+#else
+constexpr int kCtrlCs = 1;
+#endif
+
+TEST_F(InstallTest, WaitsForTheEndAfterCtrlC) {
+    HeldFlash flash(m_flash);
+    Program program(command(kInstall), Program::Output::Terminal, {"TERM=xterm", "NO_COLOR"});
+    ASSERT_TRUE(program.waitFor("eth0  ["));
+    // The runtime of Clang 14's thread sanitizer loses a signal now and then; there a user presses again.
+    for (int round = 0; round < kCtrlCs; ++round) {
+        program.type("\x03");
+        if (kCtrlCs > 1) std::this_thread::sleep_for(std::chrono::milliseconds(300));
+    }
+    EXPECT_TRUE(program.waitFor("it runs to its end, and this program waits for it."));
+    flash.release();
+    EXPECT_EQ(program.finish().status, 0);
+    EXPECT_EQ(firmwareOf("eth0"), kNew);
+}
+
+TEST_F(InstallTest, GoesOnWhenNobodyListensAnyMore) {
+    HeldFlash flash(m_flash);
+    Program program(command(kInstall));
+    ASSERT_TRUE(program.waitFor("eth0: 0 %"));
+    program.closeOutput();
+    flash.release();
+    EXPECT_EQ(program.finish().status, 0);
+    EXPECT_EQ(firmwareOf("eth0"), kNew);
+}
+
+TEST_F(InstallTest, LeavesTheOldFirmwareWhenKilledHalfway) {
+    describeAdapters("action = \"kill\"\npercent = 50");
+    EXPECT_EQ(quenxctl(kInstall).status, -SIGKILL);
+    describeAdapters();
+    EXPECT_EQ(firmwareOf("eth0"), kOld);
+    EXPECT_EQ(quenxctl(kInstall).status, 0);
+    EXPECT_EQ(firmwareOf("eth0"), kNew);
+}
+
+TEST_F(InstallTest, TellsASecondProcessWhoHoldsTheAdapter) {
+    HeldFlash flash(m_flash);
+    Program first(command(kInstall));
+    ASSERT_TRUE(flash.isWaitedFor());
+    const ProgramResult second = quenxctl(kInstall);
+    EXPECT_EQ(second.status, 1) << second.out;
+    const std::string reason = "The update of eth0 failed: adapter eth0 is being written to by process ";
+    EXPECT_TRUE(contains(second.error, reason + std::to_string(first.id()))) << second.error;
+    EXPECT_EQ(firmwareOf("eth0"), kOld) << "readers do not wait";
+    EXPECT_EQ(quenxctl("install --target eth1 IMAGE").status, 0) << "another port is free";
+    flash.release();
+    EXPECT_EQ(first.finish().status, 0);
+    EXPECT_EQ(firmwareOf("eth0"), kNew);
+}
+
+}  // namespace

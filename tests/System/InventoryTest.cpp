@@ -1,0 +1,132 @@
+// SPDX-License-Identifier: Apache-2.0
+#include <filesystem>
+#include <nlohmann/json.hpp>
+#include <regex>
+#include <set>
+
+#include "System/Quenxctl.h"
+
+namespace {
+
+using test::contains;
+
+/// Images in a directory that the inventory looks into.
+class InventoryTest : public test::Quenxctl {
+  protected:
+    InventoryTest() {
+        std::filesystem::create_directory(m_folder / "firmware");
+        m_folder.write("firmware/new.rom", test::readTestFile(m_image));
+        m_folder.write("firmware/other.rom", test::realRom("efi-rtl8139"));
+        m_folder.write("firmware/broken.rom", "no image");
+        m_folder.write("default.conf", "FWFilePath=" + (m_folder / "firmware") + "\n");
+    }
+
+    /// The first id with this in it: an image's has the ids of its device, as "1af4-1041".
+    std::string idOf(const std::string& part) const {
+        const auto document = nlohmann::json::parse(quenxctl("identities --json").out);
+        for (const auto& one : document["identities"]) {
+            if (contains(one["id"], part)) return one["id"];
+        }
+        return "no id with " + part;
+    }
+};
+
+TEST_F(InventoryTest, ListsFilesAndWhatIsInstalled) {
+    const std::string table = quenxctl("identities").out;
+    for (const char* part : {"IMG_PXE 2, IMG_UEFI 2  IMG_PXE,IMG_UEFI  file://", "/firmware/new.rom",
+                             "/firmware/other.rom", "Firmware of adapter eth0"}) {
+        EXPECT_TRUE(contains(table, part)) << part << "\n" << table;
+    }
+    EXPECT_FALSE(contains(table, "broken.rom")) << table;
+}
+
+TEST_F(InventoryTest, ChangesNothingByACheckAndInstallsByIdentity) {
+    const std::string identity = " --target eth0 --identity " + idOf("1af4-1041");
+    const std::string installable = "The image can be installed on eth0.\n";
+    EXPECT_EQ(quenxctl("check" + identity).out, installable);
+    // A file need not be in the inventory.
+    EXPECT_EQ(quenxctl("check --target eth0 IMAGE").out, installable);
+    EXPECT_EQ(firmwareOf("eth0"), "IMG_PXE 1, IMG_UEFI 0");
+    EXPECT_EQ(quenxctl("install" + identity).status, 0);
+    EXPECT_EQ(firmwareOf("eth0"), "IMG_PXE 2, IMG_UEFI 2");
+    EXPECT_EQ(quenxctl("check" + identity).status, 3);
+    EXPECT_EQ(quenxctl("install" + identity).status, 3);
+    EXPECT_EQ(quenxctl("install --force" + identity).status, 0);
+}
+
+TEST_F(InventoryTest, SaysWhatToDoAboutARefusal) {
+    const std::string image = " --identity " + idOf("1af4-1041");
+    const std::string other = " --target eth0 --identity " + idOf("10ec-8139");
+    expectError("check" + other, 1, "is for 10ec:8139, but eth0 is 1af4:1041.");
+    expectError("install" + other, 1, "is for 10ec:8139, but eth0 is 1af4:1041.");
+    expectError("check --target eth0 --identity none", 4, "There is no software identity \"none\".");
+    expectError("check --target eth0 --identity " + idOf("eth0"), 4, "there is no image file of it");
+    expectError("check --target eth3" + image, 1, "cannot be updated");
+    expectError("install --types IMG_PXE" + other, 2, "--identity cannot be used with --types.");
+}
+
+/// The words and signs of a MOF text, without what stands in quotes.
+std::vector<std::string> mofWordsOf(const std::string& mof) {
+    const std::string bare = std::regex_replace(mof, std::regex(R"("(\\.|[^"\\])*")"), "");
+    const std::regex word(R"(\w+|[^\s\w])");
+    std::vector<std::string> words;
+    for (std::sregex_iterator each(bare.begin(), bare.end(), word), end; each != end; ++each)
+        words.push_back(each->str());
+    return words;
+}
+
+/// What a MOF compiler would refuse: classes and qualifiers that are used before they are declared.
+std::string faultsOf(const std::vector<std::string>& words) {
+    std::set<std::string> classes;
+    std::set<std::string> qualifiers;
+    std::string faults;
+    const auto require = [&](const std::set<std::string>& known, const std::string& name) {
+        if (!known.contains(name)) faults += name + " is not declared\n";
+    };
+    bool isInList = false;
+    int depth = 0;  // inside a qualifier's value
+    for (std::size_t i = 0; i + 1 < words.size(); ++i) {
+        const std::string& word = words[i];
+        const std::string& next = words[i + 1];
+        if (word == "Qualifier") qualifiers.insert(next);
+        if (word == "class") classes.insert(next);
+        if (word == "class" && words[i + 2] == ":") require(classes, words[i + 3]);
+        if (next == "REF") require(classes, word);
+        if (word == "[") isInList = next != "]";
+        if (word == "]") isInList = false;
+        if (isInList) depth += word == "(" || word == "{" ? 1 : word == ")" || word == "}" ? -1 : 0;
+        if (isInList && depth == 0 && (word == "[" || word == ",")) require(qualifiers, next);
+    }
+    return faults;
+}
+
+TEST_F(InventoryTest, PrintsTheSchemaInOrderAndQualified) {
+    const std::string mof = quenxctl("mof").out;
+    const std::vector<std::string> words = mofWordsOf(mof);
+    EXPECT_EQ(faultsOf(words), "");
+    EXPECT_EQ(faultsOf(mofWordsOf("[ New ( \"[ Old\" ), Other ] class A : B { C REF D; };")),
+              "New is not declared\nOther is not declared\nB is not declared\nC is not declared\n");
+    std::string defined = "\n";
+    for (std::size_t i = 1; i < words.size(); ++i)
+        if (words[i - 1] == "class") defined += words[i] + "\n";
+    for (const char* name : {"Quenx_ConcreteJob", "Quenx_SoftwareInstallationService", "CIM_Job",
+                             "Quenx_ElementSoftwareIdentity", "CIM_PortController"}) {
+        EXPECT_TRUE(contains(defined, "\n" + std::string(name) + "\n")) << defined;
+    }
+    for (const char* part :
+         {"\"Completed\"", "\"Method Parameters Checked - Job Started\"", "[ Association,\n   Description ( ",
+          "Qualifier Key : boolean = false,\n    Scope(property, reference),\n    Flavor(DisableOverride, "
+          "ToSubclass);\n",
+          "    [ Key ]\n    CIM_ManagedElement REF Antecedent;\n",
+          "        [ In,\n           Description ( \"Where the image is.\" ) ]\n        string URI,\n",
+          "        [ In ( false ),\n           Out,\n           Description ( \"The job that was started.\" "
+          ") ]\n"
+          "        CIM_ConcreteJob REF Job,\n",
+          "    [ Key,\n       Override ( \"Antecedent\" ) ]\n",
+          "ValueMap { \"1\", \"2\" },\n       Values { \"Local Time\", \"UTC Time\" } ]\n"
+          "    uint16 LocalOrUtcTime;\n"}) {
+        EXPECT_TRUE(contains(mof, part)) << part << "\n" << mof;
+    }
+}
+
+}  // namespace
