@@ -38,6 +38,7 @@ void addServerOptions(CLI::App& app, ServerSettings& server, const std::vector<C
                "Use a WBEM server (https://host:5989) instead of this process; images are then files on "
                "that host")
             ->type_name("URL");
+    // A server has its own; an option without effect would let its user believe otherwise.
     for (CLI::Option* option : localOptions)
         option->excludes(url);
     addValue(app, "--user", server.user, "NAME",
@@ -75,6 +76,7 @@ void addCommonOptions(CLI::App& app, Arguments& arguments) {
 }
 
 std::vector<std::string> typesOf(std::string text) {
+    // People separate by commas, the service by plus signs; either may have been copied from somewhere.
     utils::replaceCharacter(text, InstallOption::kTargetTypeSeparator, ',');
     std::vector<std::string> types;
     for (const std::string& piece : utils::split(text, ','))
@@ -104,6 +106,7 @@ void addVerbs(CLI::App& app, Arguments& arguments) {
     VerbOptions& options = arguments.options;
     const auto add = [&](const char* name, Verb verb, const char* description) {
         CLI::App* added = app.add_subcommand(name, description);
+        // Run once the whole line has been read without a mistake.
         added->callback([verb, &arguments] { arguments.verb = verb; });
         return added;
     };
@@ -172,6 +175,7 @@ bool isLongOption(const std::string& word) {
 }
 
 /// The long options that could have been meant: those of the verb, or of every verb where none was read.
+/// Short ones are too short to tell what was meant.
 std::vector<std::string> optionsOf(const CLI::App& app, const CLI::App* verb) {
     std::vector<const CLI::App*> takers = verb == nullptr ? verbsOf(app) : std::vector{verb};
     takers.push_back(&app);
@@ -259,7 +263,7 @@ std::optional<Arguments> readArguments(int argc, char** argv) {
     CLI::App app("Updates the firmware of Ethernet adapters.", "quenxctl");
     app.set_version_flag("--version", QUENX_VERSION);
     app.require_subcommand(1);
-    app.fallthrough();
+    app.fallthrough();  // options of every verb may come after the verb, too
     addCommonOptions(app, arguments);
     addVerbs(app, arguments);
     std::string helpOf;
@@ -267,7 +271,12 @@ std::optional<Arguments> readArguments(int argc, char** argv) {
     help->add_option("verb", helpOf, "Verb")->type_name("VERB");
     for (CLI::App* verb : app.get_subcommands({}))
         verb->group("Verbs");
-    app.get_formatter()->label("SUBCOMMAND", "VERB");
+    // The library's own words for these are not a user's.
+    for (const auto& [word, plain] : {std::pair{"SUBCOMMAND", "VERB"},
+                                      {"Positionals", "Arguments"},
+                                      {"Needs", "Only with"},
+                                      {"Excludes", "Not with"}})
+        app.get_formatter()->label(word, plain);
     app.footer(kFooter);  // last: verbs take over the footer that is there when they are added
     try {
         app.parse(argc, argv);
@@ -280,6 +289,7 @@ std::optional<Arguments> readArguments(int argc, char** argv) {
         printHelp(app, helpOf);
         return std::nullopt;
     }
+    // The library can forbid two options at once, but not ask for one of the two.
     const ImageOptions& image = arguments.options.image;
     const bool takesImage = arguments.verb == install || arguments.verb == check;
     if (takesImage && image.image.empty() == image.identity.empty()) {
@@ -290,6 +300,7 @@ std::optional<Arguments> readArguments(int argc, char** argv) {
 }
 
 bool asksForJson(int argc, char** argv) {
+    // Looked for here, since reading ends at the first mistake, and --json may come after that.
     return std::any_of(argv, argv + argc,
                        [](const char* word) { return std::string_view(word) == "--json"; });
 }

@@ -27,7 +27,7 @@ static_assert(std::atomic<bool>::is_always_lock_free, "a signal handler stores i
 void noteInterruptions() {
     struct sigaction action = {};
     action.sa_handler = [](int) { interruptionAsked = true; };
-    action.sa_flags = SA_RESTART;
+    action.sa_flags = SA_RESTART;  // a read or write under way is not what the user wants to stop
     for (const int signal : {SIGINT, SIGTERM, SIGHUP})
         sigaction(signal, &action, nullptr);
     action.sa_handler = SIG_IGN;
@@ -70,6 +70,7 @@ std::string sentence(std::string text) {
 }
 
 ExitStatus report(bool json, ExitStatus status, const std::string& what, const std::string& advice) {
+    // On standard output: a script reads its one document there, however the verb ended.
     if (json) {
         printJson(std::cout, {{"error", what}, {"advice", advice}, {"exitStatus", static_cast<int>(status)}});
         return status;
@@ -80,6 +81,7 @@ ExitStatus report(bool json, ExitStatus status, const std::string& what, const s
 }
 
 ExitStatus runVerb(const Arguments& arguments) {
+    // Standard output is for the document then.
     LinePrinter printer(arguments.json ? std::cerr : std::cout,
                         Terminal::of(arguments.json ? STDERR_FILENO : STDOUT_FILENO));
     ProgressDisplay progress(printer);
@@ -87,6 +89,7 @@ ExitStatus runVerb(const Arguments& arguments) {
         arguments.server.url ? openServer(arguments.server) : openProviders(arguments.providers);
     // After a prompt for the password, at which Ctrl-C is to end the program.
     if (arguments.startsUpdate()) noteInterruptions();
+    // A look costs a server a request, and this process nothing.
     const std::chrono::milliseconds pause(connection.runsJobs ? 50 : 500);
     const Following following = {[pause] { std::this_thread::sleep_for(pause); },
                                  [] { return interruptionAsked.exchange(false); }};

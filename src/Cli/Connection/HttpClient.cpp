@@ -72,6 +72,7 @@ std::string adviceFor(CURLcode code, bool isEncrypted) {
             return "Check that the server runs and that --server names its host and port.";
         case CURLE_GOT_NOTHING:
         case CURLE_RECV_ERROR:
+            // A server that expects a TLS handshake hangs up on anything else.
             if (!isEncrypted) return "The port may be one for HTTPS: try https:// in --server.";
             [[fallthrough]];
         default:
@@ -84,6 +85,7 @@ std::string adviceFor(CURLcode code, bool isEncrypted) {
 ServerUrl::ServerUrl(const std::string& text) {
     if (text.find("://") == std::string::npos) refuseUrl(text, "does not begin with https:// or http://");
     const UrlParts url(curl_url(), curl_url_cleanup);
+    // Any scheme, so that a wrong one is refused in words that say which are right.
     const CURLUcode error = curl_url_set(url.get(), CURLUPART_URL, text.c_str(), CURLU_NON_SUPPORT_SCHEME);
     if (error != CURLUE_OK) refuseUrl(text, std::string("is not a URL: ") + curl_url_strerror(error));
     const std::string scheme = partOf(url, CURLUPART_SCHEME);
@@ -116,11 +118,12 @@ HttpClient::HttpClient(const ServerSettings& settings, const std::string& user, 
     set(CURLOPT_ERRORBUFFER, m_error.data());
     set(CURLOPT_URL, m_url.c_str());
     set(CURLOPT_PROTOCOLS_STR, "http,https");
-    set(CURLOPT_NOSIGNAL, 1L);
+    set(CURLOPT_NOSIGNAL, 1L);  // signals are this program's own business
     set(CURLOPT_CONNECTTIMEOUT, kConnectSeconds);
     set(CURLOPT_TIMEOUT, kAnswerSeconds);
     set(CURLOPT_WRITEFUNCTION, &takeBody);
     set(CURLOPT_HEADERFUNCTION, &takeHeader);
+    // The one scheme that every WBEM server has; named, it is sent at once and not after a first refusal.
     set(CURLOPT_HTTPAUTH, CURLAUTH_BASIC);
     set(CURLOPT_USERNAME, user.c_str());
     set(CURLOPT_PASSWORD, password.c_str());
@@ -139,11 +142,12 @@ HttpReply HttpClient::post(const std::vector<std::string>& headers, const std::s
     for (const std::string& header : headers)
         list.reset(curl_slist_append(list.release(), header.c_str()));
     set(CURLOPT_HTTPHEADER, list.get());
+    // Neither the headers nor the body are copied: both outlive the transfer.
     set(CURLOPT_POSTFIELDS, body.c_str());
     set(CURLOPT_POSTFIELDSIZE_LARGE, static_cast<curl_off_t>(body.size()));
     set(CURLOPT_WRITEDATA, &reply);
     set(CURLOPT_HEADERDATA, &reply);
-    m_error.front() = '\0';
+    m_error.front() = '\0';  // the library does not clear what an earlier failure left
     const CURLcode code = curl_easy_perform(m_curl.get());
     if (code != CURLE_OK) refuse(code);
     curl_easy_getinfo(m_curl.get(), CURLINFO_RESPONSE_CODE, &reply.status);

@@ -55,6 +55,7 @@ void loadProviders(core::ProviderLibraries& providers, const std::string& named)
             status, "Cannot read the provider directory " + directory + ": " + error.code().message() + ".",
             advice);
     }
+    // One library alone would load, and the verbs then miss what the other one serves.
     if (!providers.problems().empty()) {
         const auto& problem = providers.problems().front();
         throw CommandError(status, "Cannot load " + problem.file + ": " + problem.reason + ".",
@@ -70,6 +71,7 @@ Connection openProviders(const ProviderSettings& settings) {
     // The configuration ignores a file that it cannot read; a user who names one wants to hear of that.
     if (!settings.configFile.empty()) requireReadable(settings.configFile, "configuration file");
     const auto session = std::make_shared<core::ProviderSession>(settings.configFile);
+    // The adapters first: providers may ask for them as soon as they are loaded.
     selectAdapters(settings);
     loadProviders(session->libraries(), settings.directory);
     // Whoever holds the operations holds the session: the libraries stay as long as somebody may call them.

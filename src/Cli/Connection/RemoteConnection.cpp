@@ -59,6 +59,7 @@ void requireOk(const HttpReply& reply) {
     const std::string wait = reply.retryAfter.empty() ? "a while" : reply.retryAfter + " seconds";
     const std::string why = reply.cimError.empty() ? "" : " (" + reply.cimError + ")";
     switch (reply.status) {
+        // CIM errors come with it, too: any other status is about the way there.
         case 200:
             return;
         case 401:
@@ -143,6 +144,7 @@ class RemoteOperations : public core::CimOperations {
 };
 
 cimxml::Response RemoteOperations::send(cimxml::Request request, const std::string& object) {
+    // Tells the answers of one client apart in a server's trace (DSP0201).
     request.messageId = std::to_string(++m_messages);
     // Without the empty "Expect:", a large body waits a second for servers that do not answer it.
     const HttpReply reply = m_client.post(
@@ -168,6 +170,7 @@ IntrinsicResult RemoteOperations::call(const std::string& operation, Parameters 
     request.call = cimxml::IntrinsicCall{operation, m_namespace, std::move(parameters)};
     cimxml::Response response = send(std::move(request), m_namespace);
     auto* result = std::get_if<IntrinsicResult>(&response.content);
+    // A server that answers with a method's response has at least nothing to tell.
     if (result == nullptr) return {};
     for (core::InstanceValue& instance : result->instances)
         complete(instance.path);
@@ -228,6 +231,7 @@ std::vector<core::ClassChain> RemoteOperations::enumerateClasses(const std::stri
 /// The line that the user answers with. Throws CommandError with these texts where nobody can answer.
 std::string ask(const std::string& prompt, const std::string& missing, const std::string& advice) {
     std::string line;
+    // In a script or a service nobody would answer, and the program would wait for ever.
     if (isatty(STDIN_FILENO) == 1) {
         std::cerr << prompt << std::flush;
         if (std::getline(std::cin, line) && !line.empty()) return line;
@@ -244,6 +248,7 @@ std::string userName() {
 }
 
 std::string passwordOf(const std::string& user) {
+    // No option takes it: every user of the machine can read the command lines of the others.
     const char* given = std::getenv("QUENXCTL_PASSWORD");
     if (given != nullptr) return given;
     const os::EchoOff silence;

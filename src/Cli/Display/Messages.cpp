@@ -55,6 +55,7 @@ std::string didYouMean(std::string_view word, const std::vector<std::string>& kn
     // The distance takes time and memory by the product of both lengths, and nobody mistypes more than this.
     constexpr std::size_t kLongest = 64;
     if (word.empty() || word.size() > kLongest) return {};
+    // A third of the letters wrong is a typing error; more is another word.
     const std::size_t farthest = std::max<std::size_t>(1, word.size() / 3);
     std::size_t nearest = farthest + 1;
     const std::string* found = nullptr;

@@ -32,6 +32,7 @@ void printJson(std::ostream& out, const Json& document) {
 }
 
 void printTable(std::ostream& out, const std::vector<std::vector<std::string>>& rows) {
+    // Measured as printed: a control character takes four columns.
     std::vector<std::size_t> widths;
     for (const auto& row : rows) {
         widths.resize(std::max(widths.size(), row.size()));
@@ -63,6 +64,7 @@ std::string displayText(const core::CimValue& value) {
 namespace nlohmann {
 
 void adl_serializer<core::CimValue>::to_json(cli::Json& json, const core::CimValue& value) {
+    // Null, where neither holds, is what the document is already.
     if (const core::CimScalar* scalar = value.scalar()) {
         json = std::visit(cli::ScalarToJson(), *scalar);
     } else if (const std::vector<core::CimScalar>* elements = value.elements()) {

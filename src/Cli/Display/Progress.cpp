@@ -27,6 +27,7 @@ std::optional<double> speedOf(const UpdateProgress& progress) {
 std::vector<std::string> details(const UpdateProgress& progress) {
     std::vector<std::string> parts;
     if (progress.bytes != 0) {
+        // An estimate: the service tells percent, and the image's size is what this program knows.
         parts.push_back(byteText(progress.bytes * progress.percent / 100) + " of " +
                         byteText(progress.bytes));
     }
@@ -97,6 +98,7 @@ ProgressDisplay::ProgressDisplay(LinePrinter& printer, Clock clock)
 void ProgressDisplay::started(const std::string& adapter, std::uint64_t bytes) {
     m_progress = {adapter, 0, bytes, std::chrono::milliseconds(0), 0};
     m_movesSince.reset();
+    // A log shows at once what the program waits for; a bar comes with the first look.
     if (!m_printer.canRewrite()) showLine(m_clock());
 }
 
@@ -113,6 +115,7 @@ void ProgressDisplay::progressed(unsigned percent) {
 
     if (m_printer.canRewrite()) {
         m_printer.rewrite(barText(m_progress, m_printer.width()));
+        // Now and then even when nothing moves: a silent log looks like a program that hangs.
     } else if (percent >= m_lastLine + kLineEveryPercent || (percent == 100 && m_lastLine != 100) ||
                now - m_lastLineAt >= kLineAtLeastEvery) {
         showLine(now);

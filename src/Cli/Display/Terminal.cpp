@@ -65,6 +65,7 @@ std::string elideMiddle(std::string_view text, std::size_t width) {
 }
 
 Terminal Terminal::of(int descriptor) {
+    // NO_COLOR asks for no colours, but people set it wherever escape sequences do harm.
     const char* term = std::getenv("TERM");
     const bool isDumb = term == nullptr || std::string_view(term) == "dumb";
     return {isatty(descriptor) == 1 && !isDumb && !isSet("NO_COLOR"), descriptor};
@@ -83,6 +84,7 @@ std::size_t LinePrinter::width() const {
 }
 
 void LinePrinter::print(const std::string& line) {
+    // The line that stays takes the bottom line's place, which is written again below it.
     if (!m_bottom.empty()) m_out << kClearLine;
     m_out << line << '\n' << m_bottom << std::flush;
 }

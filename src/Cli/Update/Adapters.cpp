@@ -32,6 +32,7 @@ std::string_view withoutDomain(std::string_view pciAddress) {
 bool isMeant(const Adapter& adapter, const std::string& target) {
     const std::string_view address = withoutDomain(adapter.pciAddress);
     const core::CimPath path(target);
+    // An adapter without an address must not be meant by an empty one.
     return adapter.name == target || (!address.empty() && core::sameName(address, withoutDomain(target))) ||
            (path.isInstancePath() && adapter.path.isSameObjectAs(path));
 }
@@ -69,6 +70,7 @@ std::vector<Component> readComponents(core::CimOperations& operations, const cor
     for (const core::InstanceValue& identity : operations.associators(port, installed)) {
         const std::vector<std::string> types = textsOf(identity, "TargetTypes");
         const auto version = static_cast<std::uint32_t>(numberOf(identity, "MajorVersion"));
+        // An installed identity is one component, so has one type, and the version is its major number.
         if (!types.empty()) components.push_back({types.front(), version});
     }
     return components;

@@ -16,6 +16,7 @@ void requireKnownTypes(core::CimOperations& operations, const std::vector<std::s
     if (capabilities.empty()) return;
     const std::vector<std::string> known = textsOf(capabilities.front(), "SupportedTargetTypes");
     if (known.empty()) return;
+    // The service would answer with the code that every bad argument gets.
     for (const std::string& type : types) {
         if (type.empty() || std::find(known.begin(), known.end(), type) != known.end()) continue;
         throw CommandError(ExitStatus::WrongUse, "There is no image type \"" + type + "\".",
@@ -24,6 +25,7 @@ void requireKnownTypes(core::CimOperations& operations, const std::vector<std::s
 }
 
 Candidate compared(const Connection& connection, Candidate candidate) {
+    // On another machine a file of the same path may be there, and be another.
     const std::optional<std::string> path = localPath(candidate.uri);
     if (!path || !connection.sharesFiles) return candidate;
     candidate.image = readImage(*path);

@@ -93,6 +93,7 @@ ImageFile readImage(const std::string& path) try {
         image.problem = notAnImage(path, why);
         return image;
     }
+    // Gone since it was looked at, it reads as nothing.
     const std::optional<std::vector<std::uint8_t>> content = os::readWholeFile(path, kLargestRead);
     if (!content) throw std::system_error(ENOENT, std::generic_category());
     image.rom = ma::parseOptionRom(*content);
@@ -113,12 +114,14 @@ Comparison compare(const ma::RomFile& rom, const Adapter& adapter, const std::ve
     for (const std::string& type : types) {
         const bool isThere = std::any_of(rom.images.begin(), rom.images.end(),
                                          [&](const ma::RomImage& image) { return carries(image, type); });
+        // "IMG_PXE+" asks for an empty type besides, which the service ignores, too.
         if (!type.empty() && !isThere) result.missing.push_back(type);
     }
     for (const ma::RomImage& image : rom.images) {
         const bool isChosen =
             types.empty() || std::any_of(types.begin(), types.end(),
                                          [&](const std::string& type) { return carries(image, type); });
+        // An image can carry two types, and is written whole for either.
         if (isChosen) result.bytes += image.length;
         result.isNetwork = result.isNetwork && image.isNetwork();
     }

@@ -22,6 +22,7 @@ const core::CimPath* endOf(const core::CimPath& association, std::string_view ro
 
 /// A job does not tell its adapter; an association does.
 void nameAdapters(core::CimOperations& operations, std::vector<JobView>& jobs) {
+    // Three enumerations in all: asking for the associators of each job would be a request for each.
     const auto ports = operations.enumerateInstances("Quenx_EthernetPort");
     for (const core::CimPath& affected : operations.enumerateInstanceNames("Quenx_AffectedJobElement")) {
         const core::CimPath* element = endOf(affected, "AffectedElement");
@@ -82,6 +83,7 @@ std::optional<unsigned> JobView::certainPercent() const {
 }
 
 std::string JobView::stateName() const {
+    // The Values of JobState (DSP1103); a server may use those reserved for vendors.
     constexpr std::array<const char*, 13> kNames = {
         "",          "",           "New",    "Starting",  "Running", "Suspended",    "Shutting Down",
         "Completed", "Terminated", "Killed", "Exception", "Service", "Query Pending"};

@@ -70,6 +70,7 @@ Reason explainHiddenHolder(std::uint32_t returnValue, const Candidate& candidate
         return Explanation{"The server refuses " + name + ", although no job is running" + kHolder,
                            kWaitOrRestart};
     }
+    // A file that is no image explains the answer without anybody who holds the adapter.
     if (candidate.image && candidate.image->problem) return std::nullopt;
     return Explanation{"The server could not read or prepare the image, or another adapter than " + name +
                            " is in use" + kHolder,
@@ -126,6 +127,7 @@ std::string getImageFor(const Adapter& adapter) {
 
 Reason explainUnsupported(const Candidate& candidate) {
     const Adapter& adapter = candidate.adapter;
+    // First of all: no image at all will do for such an adapter.
     if (!adapter.updatable) {
         return Explanation{"The firmware of " + adapter.name + " cannot be updated.",
                            "\"quenxctl adapters\" shows which adapters can be updated."};
@@ -147,6 +149,7 @@ std::string olderText(const Candidate& candidate) {
     for (const Component& component : candidate.comparison->chosen) {
         const auto installed = versionOf(candidate.adapter.components, component.type);
         if (!installed || component.version >= *installed) continue;
+        // The words that all have in common are said once.
         text += (text.empty() ? "" : ", ") + component.type + " " + std::to_string(component.version) +
                 (text.empty() ? " is older" : "") + " than the installed " + std::to_string(*installed);
     }
@@ -194,6 +197,7 @@ Reason explainNotApplicable(const Candidate& candidate) {
         return Explanation{candidate.image->path + " has nothing that can be installed.",
                            getImageFor(candidate.adapter)};
     }
+    // Types that are there were refused for the target: the return value's meaning says that.
     if (candidate.comparison->missing.empty()) return std::nullopt;
     return Explanation{"The image has no " + candidate.comparison->missing.front() + ".",
                        "It has " + joined(types) + "."};
@@ -228,6 +232,7 @@ std::string readBackText(const Candidate& candidate, const std::vector<Component
 
 /// Simulated adapters keep their flash in files, which not every user may write.
 std::string permissionAdvice(const std::string& reason) {
+    // The job only carries the text that the adapter API made of the error.
     for (const int error : {EACCES, EPERM, EROFS}) {
         if (reason.find(std::generic_category().message(error)) != std::string::npos)
             return "Run quenxctl as root, or name a folder of yours with --adapters FILE --state DIR.";
@@ -239,6 +244,7 @@ std::string permissionAdvice(const std::string& reason) {
 
 Explanation explainRefusal(const Connection& connection, std::uint32_t returnValue,
                            const Candidate& candidate) {
+    // Who holds the adapter goes first: the image may be all right.
     Reason reason = explainHolder(connection, returnValue, candidate);
     if (!reason) reason = explainImage(connection, returnValue, candidate);
     return reason ? *reason : explainReturnValue(returnValue);

@@ -31,7 +31,7 @@ struct InstallCodes {
             codes.push_back(InstallOption::TargetTypes);
             values.push_back(joined(candidate.types, {&InstallOption::kTargetTypeSeparator, 1}));
         }
-        codes.push_back(InstallOption::Update);
+        codes.push_back(InstallOption::Update);  // the service requires it
         if (candidate.force) codes.push_back(InstallOption::ForceInstallation);
     }
 };
@@ -68,6 +68,7 @@ core::MethodResult startUpdate(core::CimOperations& operations, const Candidate&
 core::CimPath jobOf(const core::MethodResult& result) {
     for (const core::Argument& output : result.outputs) {
         const core::CimScalar* value = output.value.scalar();
+        // A server may give further outputs, and references among them.
         const auto* path = value == nullptr ? nullptr : std::get_if<core::CimPath>(value);
         if (path != nullptr && core::sameName(output.name, "Job")) return *path;
     }

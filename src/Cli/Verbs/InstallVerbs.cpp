@@ -81,6 +81,7 @@ ExitStatus print(Context& context, const Outcome& outcome) {
     }
     std::ostream& stream = outcome.isFailure() ? context.error : context.out;
     stream << (outcome.isFailure() ? "quenxctl: " : "") << printable(outcome.message) << '\n';
+    // After a failure the explanation says what the adapter has now.
     if (outcome.job && !outcome.isFailure()) printChange(stream, outcome);
     if (!outcome.advice.empty()) stream << printable(outcome.advice) << '\n';
     return outcome.status;
@@ -144,6 +145,7 @@ void followUpdate(Context& context, const core::CimPath& job, const Candidate& c
 ExitStatus install(Context& context, const VerbOptions& options) {
     const Candidate candidate = makeCandidate(context.connection, options.image);
     Outcome outcome(candidate);
+    // Found out here: the service would write the same image again.
     if (!candidate.force && candidate.isAlreadyCurrent()) {
         endAsCurrent(outcome, candidate);
         outcome.advice = "Use --force to write it again.";
@@ -167,6 +169,7 @@ ExitStatus check(Context& context, const VerbOptions& options) {
     const Connection& connection = context.connection;
     Candidate candidate = makeCandidate(connection, options.image);
     std::optional<std::uint32_t> returnValue = verifyOnly(connection, candidate);
+    // A server, which only checks identities: find the one that the file belongs to.
     if (!returnValue) {
         if (options.image.force || !options.image.types.empty()) {
             throw CommandError(ExitStatus::WrongUse, "A check on a server takes neither --types nor --force.",

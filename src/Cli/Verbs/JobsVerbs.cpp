@@ -26,7 +26,7 @@ std::string orDash(const std::string& text) {
 
 /// "2026-11-21 20:10:33" in the local time zone; "-" for none.
 std::string startText(const JobView& job) {
-    if (!job.start || job.start->isPeriod()) return "-";
+    if (!job.start || job.start->isPeriod()) return "-";  // an interval is no moment
     const auto seconds = static_cast<std::time_t>(job.start->getSeconds());
     std::tm local{};
     std::array<char, sizeof "9999-12-31 23:59:59"> text{};
@@ -52,6 +52,7 @@ void printJobs(std::ostream& out, const std::vector<JobView>& jobs) {
 }
 
 bool isMeant(const JobView& job, const std::string& name) {
+    // "3" must not mean job 13, so the number is compared with its mark.
     return job.id == name || job.path.toString() == name || job.id.ends_with("@Job#" + name);
 }
 
@@ -83,6 +84,7 @@ ExitStatus showJobs(Context& context, const VerbOptions&) {
 ExitStatus deleteJob(Context& context, const VerbOptions& options) {
     for (const JobView& job : jobsOfServer(context.connection)) {
         if (!isMeant(job, options.job)) continue;
+        // As it was before: afterwards nobody can ask whether it still ran.
         context.connection.operations->deleteInstance(job.path);
         printDeleted(context, job);
         return ExitStatus::Done;

@@ -50,6 +50,7 @@ ExitStatus showInstances(Context& context, const VerbOptions& options) try {
     return options.namesOnly ? print(context, operations.enumerateInstanceNames(options.className))
                              : print(context, operations.enumerateInstances(options.className));
 } catch (const core::CimError& error) {
+    // Looked up only now: a class that is served needs no list of the others.
     if (error.status() != core::CimStatus::InvalidClass) throw;
     throw CommandError(
         ExitStatus::NotFound, "No class \"" + options.className + "\" is served.",

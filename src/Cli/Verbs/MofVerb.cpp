@@ -33,6 +33,7 @@ std::string qualifierText(const core::Qualifier& qualifier) {
 std::string qualifierList(const std::vector<core::Qualifier>& qualifiers, const std::string& indent) {
     std::vector<std::string> texts;
     for (const core::Qualifier& qualifier : qualifiers) {
+        // What is inherited would be an override here, which some qualifiers do not allow.
         if (!qualifier.isPropagated) texts.push_back(qualifierText(qualifier));
     }
     if (texts.empty()) return {};
@@ -85,6 +86,7 @@ std::string classText(const core::ClassDeclaration& declaration) {
     return text + "};\n";
 }
 
+/// The classes that are still to be written, by folded name: the same order on every machine.
 using Waiting = std::map<std::string, const core::ClassDeclaration*>;
 
 bool isDone(const Waiting& waiting, const std::string& name, const core::ClassDeclaration& user) {
@@ -110,6 +112,7 @@ Waiting::const_iterator nextClass(const Waiting& waiting) {
         if (refersToDone(waiting, *each->second)) return each;
         if (best == waiting.end()) best = each;
     }
+    // None fits only where a server sends classes that are their own superclasses: an end all the same.
     return best == waiting.end() ? waiting.begin() : best;
 }
 
