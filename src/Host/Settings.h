@@ -62,7 +62,7 @@ struct Settings {
     std::string providerConfiguration;  ///< empty: the providers' own default
     std::string adapters;               ///< description of simulated adapters; empty: default
     std::string adapterState;           ///< their state directory; empty: default
-    std::string lockFile = "/run/quenx-cimd.lock";
+    std::string lockFile = "/run/quenx-cimd/lock";
 };
 
 }  // namespace host

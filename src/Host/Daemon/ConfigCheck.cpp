@@ -26,7 +26,8 @@ namespace fs = std::filesystem;
 bool isDaemonRunning(const std::string& file) {
     if (fs::exists(file)) return !LockFile(file).isHeld();
     const fs::path directory = fs::absolute(file).parent_path();
-    if (!fs::is_directory(directory)) {
+    // The folder of the default is made at the start.
+    if (file != Settings().lockFile && !fs::is_directory(directory)) {
         throw std::runtime_error("daemon.lock_file is " + file + ", but there is no directory " +
                                  directory.string() + ". Make it, or set daemon.lock_file to another file.");
     }

@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Host/Daemon/Daemon.h"
 
+#include <sys/stat.h>
+
 #include <cerrno>
 #include <stdexcept>
 #include <system_error>
@@ -44,9 +46,16 @@ std::string runningUpdates(core::CimOperations& operations) {
     return text;
 }
 
+/// systemd makes the folder of the default lock file (RuntimeDirectory=); without it a start by hand does.
+const std::string& withItsFolder(const std::string& path) {
+    if (path == Settings().lockFile) ::mkdir(path.substr(0, path.rfind('/')).c_str(), S_IRWXU);
+    return path;
+}
+
 }  // namespace
 
-LockFile::LockFile(const std::string& path) try : m_path(path), m_lock(path, os::FileLock::Mode::Try) {
+LockFile::LockFile(const std::string& path) try
+    : m_path(path), m_lock(withItsFolder(path), os::FileLock::Mode::Try) {
 } catch (const std::system_error& error) {
     throw std::runtime_error("Cannot write the lock file " + path + ": " + error.code().message() + ". " +
                              (error.code().value() == EACCES
