@@ -17,10 +17,10 @@ namespace test {
 class HeldFlash {
   public:
     /// @param folder  the adapter's, in the state directory; made when it is not there yet
-    explicit HeldFlash(const std::string& folder) : folder_(folder) {
+    explicit HeldFlash(const std::string& folder) : m_folder(folder) {
         std::filesystem::create_directories(folder);
-        lock_ = ::open((folder + "/state.lock").c_str(), O_RDWR | O_CREAT | O_CLOEXEC, 0644);
-        ::flock(lock_, LOCK_EX);
+        m_lock = ::open((folder + "/state.lock").c_str(), O_RDWR | O_CREAT | O_CLOEXEC, 0644);
+        ::flock(m_lock, LOCK_EX);
     }
     ~HeldFlash() { release(); }
 
@@ -28,7 +28,7 @@ class HeldFlash {
     bool isWaitedFor() const {
         std::error_code error;
         for (int round = 0; round < 1000; ++round) {
-            const auto size = std::filesystem::file_size(folder_ + "/flash.lock", error);
+            const auto size = std::filesystem::file_size(m_folder + "/flash.lock", error);
             if (!error && size != 0) return true;
             std::this_thread::sleep_for(std::chrono::milliseconds(20));
         }
@@ -37,13 +37,13 @@ class HeldFlash {
 
     /// Lets updates go on.
     void release() {
-        if (lock_ >= 0) ::close(lock_);
-        lock_ = -1;
+        if (m_lock >= 0) ::close(m_lock);
+        m_lock = -1;
     }
 
   private:
-    const std::string folder_;
-    int lock_ = -1;
+    const std::string m_folder;
+    int m_lock = -1;
 };
 
 }  // namespace test

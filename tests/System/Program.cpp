@@ -17,7 +17,7 @@ namespace test {
 
 namespace {
 
-constexpr int SILENCE_MS = 60'000;
+constexpr int kSilenceMs = 60'000;
 
 [[noreturn]] void become(const std::vector<std::string>& command,
                          const std::vector<std::string>& environment) {
@@ -53,8 +53,8 @@ Program::Program(const std::vector<std::string>& command, Output output,
                  const std::vector<std::string>& environment) {
     if (output == Output::Terminal) {
         const winsize size{24, 100, 0, 0};
-        child_ = forkpty(&out_, nullptr, nullptr, &size);
-        if (child_ == 0) {
+        m_child = forkpty(&m_out, nullptr, nullptr, &size);
+        if (m_child == 0) {
             // Else Ctrl-C throws away what the program has just said and the test has not read yet.
             termios mode{};
             tcgetattr(STDIN_FILENO, &mode);
@@ -69,66 +69,66 @@ Program::Program(const std::vector<std::string>& command, Output output,
     if (pipe2(out.data(), O_CLOEXEC) != 0 || pipe2(error.data(), O_CLOEXEC) != 0) {
         throw std::system_error(errno, std::generic_category(), "pipe2");
     }
-    child_ = fork();
-    if (child_ == 0) {
+    m_child = fork();
+    if (m_child == 0) {
         dup2(out[1], STDOUT_FILENO);
         dup2(error[1], STDERR_FILENO);
         become(command, environment);
     }
     close(out[1]);
     close(error[1]);
-    out_ = out[0];
-    error_ = error[0];
+    m_out = out[0];
+    m_error = error[0];
 }
 
 Program::~Program() {
-    if (child_ > 0) {
-        kill(child_, SIGKILL);
-        waitpid(child_, nullptr, 0);
+    if (m_child > 0) {
+        kill(m_child, SIGKILL);
+        waitpid(m_child, nullptr, 0);
     }
-    closeOnce(out_);
-    closeOnce(error_);
+    closeOnce(m_out);
+    closeOnce(m_error);
 }
 
 bool Program::readSome() {
-    std::array<pollfd, 2> watched = {{{out_, POLLIN, 0}, {error_, POLLIN, 0}}};
-    if ((out_ < 0 && error_ < 0) || poll(watched.data(), watched.size(), SILENCE_MS) <= 0) return false;
-    if (watched[0].revents != 0 && !readInto(out_, result_.out)) closeOnce(out_);
-    if (watched[1].revents != 0 && !readInto(error_, result_.error)) closeOnce(error_);
+    std::array<pollfd, 2> watched = {{{m_out, POLLIN, 0}, {m_error, POLLIN, 0}}};
+    if ((m_out < 0 && m_error < 0) || poll(watched.data(), watched.size(), kSilenceMs) <= 0) return false;
+    if (watched[0].revents != 0 && !readInto(m_out, m_result.out)) closeOnce(m_out);
+    if (watched[1].revents != 0 && !readInto(m_error, m_result.error)) closeOnce(m_error);
     return true;
 }
 
 bool Program::waitFor(const std::string& text) {
-    while (!contains(result_.out, text) && !contains(result_.error, text)) {
+    while (!contains(m_result.out, text) && !contains(m_result.error, text)) {
         if (!readSome()) return false;
     }
     return true;
 }
 
 void Program::type(const std::string& keys) {
-    if (write(out_, keys.data(), keys.size()) < 0)
+    if (write(m_out, keys.data(), keys.size()) < 0)
         throw std::system_error(errno, std::generic_category(), "write");
 }
 
 void Program::send(int signal) {
     // After finish() there is no child, and kill() would take -1 for every process there is.
-    if (child_ > 0) kill(child_, signal);
+    if (m_child > 0) kill(m_child, signal);
 }
 
 void Program::closeOutput() {
-    closeOnce(out_);
+    closeOnce(m_out);
 }
 
 ProgramResult Program::finish() {
     while (readSome()) {
     }
     // Still open: the program hangs.
-    if (out_ >= 0 || error_ >= 0) kill(child_, SIGKILL);
+    if (m_out >= 0 || m_error >= 0) kill(m_child, SIGKILL);
     int status = 0;
-    waitpid(child_, &status, 0);
-    child_ = -1;
-    result_.status = WIFEXITED(status) ? WEXITSTATUS(status) : -WTERMSIG(status);
-    return result_;
+    waitpid(m_child, &status, 0);
+    m_child = -1;
+    m_result.status = WIFEXITED(status) ? WEXITSTATUS(status) : -WTERMSIG(status);
+    return m_result;
 }
 
 bool contains(const std::string& text, const std::string& part) {

@@ -35,9 +35,9 @@ class Program {
     void send(int signal);
     /// Closes the reading end of standard output.
     void closeOutput();
-    pid_t id() const { return child_; }
+    pid_t id() const { return m_child; }
     /// What it has written to standard output so far, as far as it was waited for.
-    const std::string& seen() const { return result_.out; }
+    const std::string& seen() const { return m_result.out; }
 
     /// Reads to the end, and returns what there was from the start.
     ProgramResult finish();
@@ -45,10 +45,10 @@ class Program {
   private:
     bool readSome();
 
-    pid_t child_ = -1;
-    int out_ = -1;
-    int error_ = -1;
-    ProgramResult result_;
+    pid_t m_child = -1;
+    int m_out = -1;
+    int m_error = -1;
+    ProgramResult m_result;
 };
 
 bool contains(const std::string& text, const std::string& part);
