@@ -90,6 +90,7 @@ core::MethodDeclaration readMethod(const pugi::xml_node& element) {
     readOrigin(element, method);
     method.qualifiers = readQualifiers(element);
     for (const pugi::xml_node& child : childElements(element)) {
+        // What else stands here are the qualifiers, which have been read.
         if (startsWith(child, "PARAMETER")) method.parameters.push_back(readParameter(child));
     }
     return method;

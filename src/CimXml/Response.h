@@ -60,13 +60,13 @@ inline std::string_view resultElement(ResultKind kind) {
 /// The result of an intrinsic operation: the list that goes with the kind, the others empty.
 struct IntrinsicResult {
     ResultKind kind = ResultKind::Nothing;
-    std::vector<core::InstanceValue> instances;
-    std::vector<core::CimPath> paths;
-    std::vector<core::ClassDeclaration> classes;
-    std::vector<std::string> classNames;
-    std::vector<core::QualifierDeclaration> qualifiers;
-    std::vector<core::Argument> outputs;
-    std::shared_ptr<const Origins> origins;  ///< null when class origins are not asked for
+    std::vector<core::InstanceValue> instances = {};
+    std::vector<core::CimPath> paths = {};
+    std::vector<core::ClassDeclaration> classes = {};
+    std::vector<std::string> classNames = {};
+    std::vector<core::QualifierDeclaration> qualifiers = {};
+    std::vector<core::Argument> outputs = {};
+    std::shared_ptr<const Origins> origins = {};  ///< null when class origins are not asked for
 };
 
 struct Response {

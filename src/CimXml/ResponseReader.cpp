@@ -94,7 +94,7 @@ void readReturned(IntrinsicResult& result, const pugi::xml_node& element) {
             result.classNames.push_back(requiredAttribute(element, "NAME"));
             break;
         default:
-            break;
+            break;  // qualifier declarations: the schema's own are known, and others are of no use here
     }
 }
 

@@ -21,6 +21,7 @@ class Signals {
         for (const int signal : {SIGTERM, SIGINT, SIGHUP})
             ::sigaddset(&m_set, signal);
         ::pthread_sigmask(SIG_BLOCK, &m_set, nullptr);
+        // A client that goes away while it is answered must not end the daemon.
         (void)std::signal(SIGPIPE, SIG_IGN);
     }
 

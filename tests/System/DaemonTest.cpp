@@ -239,15 +239,15 @@ TEST(DaemonTest, AsksPamAndTheGroupsOfTheSystem) {
         GTEST_SKIP() << "nothing can be mounted";
     // A system of its own: the users below, all with the password "secret".
     const test::TempFolder etc;
-    const std::string hash =
-        "$6$quenxtest$.xlSksxRD.dejcRvfnG4BPvAFrzRVgFmpd5.PLjUWcskxPz5GZtukA9MFOf55EEozqmI15fR8UkYekJBjxiOL0";
-    std::string passwd, shadow;
-    int id = 0;
-    for (const char* name : {"root", "chief", "reader", "watcher", "other", "expired"}) {
-        const std::string number = std::to_string(id++);
-        passwd += std::string(name) + ":x:" + number + ":" + number + "::/:/bin/sh\n";
-        shadow += name + (":" + hash) +
-                  ":19000:0:99999:7::" + (name == std::string("expired") ? "19001" : "") + ":\n";
+    const std::string secret =
+        ":$6$quenxtest$.xlSksxRD.dejcRvfnG4BPvAFrzRVgFmpd5."
+        "PLjUWcskxPz5GZtukA9MFOf55EEozqmI15fR8UkYekJBjxiOL0:"
+        "19000:0:99999:7::";
+    std::string passwd = "root:x:0:0::/:/bin/sh\n";
+    std::string shadow = "root" + secret + ":\nexpired" + secret + "19001:\n";
+    for (const std::string name : {"chief", "reader", "watcher", "other", "expired"}) {
+        passwd += name + ":x:" + std::to_string(passwd.size()) + ":1::/:/bin/sh\n";
+        if (name != "expired") shadow += name + secret + ":\n";
     }
     etc.write("passwd", passwd);
     etc.write("shadow", shadow);
@@ -348,29 +348,23 @@ TEST(DaemonTest, NamesWhatKeepsItFromServing) {
                                          "--listen-https=false", "--listen-http"});
         return test::run(options);
     };
-    const std::string held = daemon.folder() / "lock";
-    const std::string lock = folder / "lock";
+    const std::string held = "--daemon-lock-file=" + (daemon.folder() / "lock");
+    const std::string lock = "--daemon-lock-file=" + (folder / "lock");
     const std::string port = std::to_string(daemon.httpPort());
+    const std::string taken = "--listen-http-port=" + port;
+    const std::string free = "--listen-http-port=0";
     const struct {
         int status;
         std::vector<std::string> options;
         std::string said;
     } table[] = {
-        {1,
-         {"--daemon-lock-file", held},
-         "process " + std::to_string(daemon.program().id()) + " holds " + held},
-        {1,
-         {"--daemon-lock-file", lock, "--listen-http-port", port},
-         "Cannot listen on 127.0.0.1 port " + port + ": Address already in use. Stop the program that"},
+        {1, {held, free}, "process " + std::to_string(daemon.program().id()) + " holds "},
+        {1, {lock, taken}, "127.0.0.1 port " + port + ": Address already in use. Stop the program that"},
         // The lock is free again.
-        {1,
-         {"--daemon-lock-file", lock, "--listen-http-port", "0", "--providers-directory", "/nonexistent"},
-         "/nonexistent"},
+        {1, {lock, free, "--providers-directory=/nonexistent"}, "/nonexistent"},
         // A check says the same, but not of the daemon that a start would replace.
-        {2,
-         {"--check-config", "--daemon-lock-file", lock, "--listen-http-port", port},
-         "port " + port + ": Address already in use."},
-        {0, {"--check-config", "--daemon-lock-file", held, "--listen-http-port", port}, ""},
+        {2, {"--check-config", lock, taken}, "port " + port + ": Address already in use."},
+        {0, {"--check-config", held, taken}, ""},
     };
     for (const auto& row : table) {
         const ProgramResult result = started(row.options);

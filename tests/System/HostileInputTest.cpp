@@ -60,10 +60,9 @@ class HostileInputTest : public ::testing::Test {
         EXPECT_LT(usage.ru_maxrss / 1024, kMostMemory);
     }
 
-    std::string answerTo(const std::string& bytes, bool endsThere = false) const {
+    std::string answerTo(const std::string& bytes) const {
         const RawConnection connection(m_daemon.httpPort(), kBadAddress);
         connection.send(bytes);
-        if (endsThere) connection.endSending();
         return connection.receive();
     }
 
@@ -116,19 +115,7 @@ TEST_F(HostileInputTest, RefusesWhatIsTooLarge) {
     EXPECT_TRUE(longer.isClosed());
 }
 
-TEST_F(HostileInputTest, RefusesBodiesByTheirFault) {
-    std::string nested;
-    for (int i = 0; i < 20000; ++i)
-        nested += "<a>";
-    for (const std::string& body : {std::string("\0", 1), std::string(), nested}) {
-        const std::string answer = answerTo(httpRequest(body));
-        EXPECT_EQ(statusOf(answer), 400) << body.substr(0, 40);
-        EXPECT_NE(answer.find("CIMError: request-not-well-formed"), std::string::npos) << answer;
-    }
-    EXPECT_NE(answerTo(httpRequest("<CIM/>")).find("CIMError: request-not-valid"), std::string::npos);
-}
-
-TEST_F(HostileInputTest, JudgesTheHeadBeforeTheBody) {
+TEST_F(HostileInputTest, RefusesARequestByItsFault) {
     const std::string type = "application/xml";
     const std::string length = "Content-Length: " + std::to_string(m_body.size());
     const std::string call = "CIMOperation: MethodCall";
@@ -140,6 +127,8 @@ TEST_F(HostileInputTest, JudgesTheHeadBeforeTheBody) {
         int status;
         const char* header;
     } table[] = {
+        {"</CIM>", "</CIX>", 400, "CIMError: request-not-well-formed"},
+        {"<MESSAGE ID", "<MESSAGE IX", 400, "CIMError: request-not-valid"},
         {basic, "X: ", 401, login},
         {basic, "Authorization: Bearer ", 401, login},
         {basic, "Authorization: Basic !!!! ", 401, login},
@@ -170,19 +159,6 @@ TEST_F(HostileInputTest, JudgesTheHeadBeforeTheBody) {
         const std::string answer = answerTo(request.replace(request.find(row.from), row.from.size(), row.to));
         EXPECT_EQ(statusOf(answer), row.status) << row.to;
         EXPECT_NE(answer.find(row.header), std::string::npos) << answer;
-    }
-}
-
-TEST_F(HostileInputTest, SurvivesPrefixesAndFlippedBits) {
-    const std::size_t end = m_request.find("</CIM>") + 6;
-    for (std::size_t length = 0; length < end; ++length)
-        EXPECT_NE(statusOf(answerTo(m_request.substr(0, length), true)), 200) << length;
-    std::mt19937 random(3);
-    for (int round = 0; round < 1000; ++round) {
-        std::string flipped = m_request;
-        flipped[m_request.find("\r\n\r\n") + random() % m_body.size()] ^=
-            static_cast<char>(1U << random() % 8);
-        answerTo(flipped, true);
     }
 }
 

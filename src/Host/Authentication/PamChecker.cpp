@@ -67,32 +67,24 @@ class PamSession {
     int m_status = PAM_SYSTEM_ERR;
 };
 
-struct Account {
-    bool known = false;
-    uid_t uid = 0;
-    gid_t gid = 0;
-};
-
-Account findAccount(const std::string& user) {
+/// The account's user and primary group; nothing for an unknown name.
+std::optional<std::pair<uid_t, gid_t>> findAccount(const std::string& user) {
     passwd entry{};
     passwd* found = nullptr;
     std::array<char, 16384> buffer{};
     // Not getpwnam(): requests are served on many threads.
-    if (::getpwnam_r(user.c_str(), &entry, buffer.data(), buffer.size(), &found) != 0 || found == nullptr) {
-        return {};
-    }
-    return {true, entry.pw_uid, entry.pw_gid};
+    if (::getpwnam_r(user.c_str(), &entry, buffer.data(), buffer.size(), &found) != 0 || found == nullptr)
+        return std::nullopt;
+    return std::pair(entry.pw_uid, entry.pw_gid);
 }
 
 std::vector<gid_t> groupsOf(const std::string& user, gid_t first) {
-    int count = 64;
+    // The first call says how many there are.
+    int count = 0;
+    ::getgrouplist(user.c_str(), first, nullptr, &count);
     std::vector<gid_t> groups(static_cast<std::size_t>(count));
-    // It says how many there are when the list is too short.
-    if (::getgrouplist(user.c_str(), first, groups.data(), &count) < 0) {
-        groups.resize(static_cast<std::size_t>(count));
-        ::getgrouplist(user.c_str(), first, groups.data(), &count);
-    }
-    groups.resize(static_cast<std::size_t>(count));
+    ::getgrouplist(user.c_str(), first, groups.data(), &count);
+    groups.resize(std::min(groups.size(), static_cast<std::size_t>(count)));
     return groups;
 }
 
@@ -106,14 +98,14 @@ bool isMember(const std::vector<gid_t>& groups, const std::string& group) {
     return std::find(groups.begin(), groups.end(), entry.gr_gid) != groups.end();
 }
 
-}  // namespace
-
+/// What a user of the system may do.
 User systemUser(const std::string& name, const std::vector<std::string>& readers) {
     User user{name, false, false};
-    const Account account = findAccount(name);
-    if (!account.known) return user;
-    const std::vector<gid_t> groups = groupsOf(name, account.gid);
-    user.isAdministrator = account.uid == 0 || isMember(groups, kAdministrators);
+    const auto account = findAccount(name);
+    // PAM can know users that the system does not; without groups they may do nothing.
+    if (!account) return user;
+    const std::vector<gid_t> groups = groupsOf(name, account->second);
+    user.isAdministrator = account->first == 0 || isMember(groups, kAdministrators);
     user.mayRead =
         user.isAdministrator || std::any_of(readers.begin(), readers.end(), [&](const std::string& reader) {
             if (reader.starts_with('@')) return isMember(groups, reader.substr(1));
@@ -121,6 +113,8 @@ User systemUser(const std::string& name, const std::vector<std::string>& readers
         });
     return user;
 }
+
+}  // namespace
 
 std::optional<User> PamChecker::check(const Credentials& credentials, const std::string& address) {
     if (!PamSession(credentials, address).authenticate()) return std::nullopt;

@@ -51,9 +51,6 @@ class PamChecker : public PasswordChecker {
     const std::vector<std::string> m_readers;
 };
 
-/// What a user of the system may do. An unknown one may do nothing.
-User systemUser(const std::string& name, const std::vector<std::string>& readers);
-
 /// A user as the users file has it. One per line: `name:hash:role`, the hash as of crypt(3), the role "admin"
 /// or "reader"; empty lines and lines that begin with # are passed over.
 struct UserEntry {

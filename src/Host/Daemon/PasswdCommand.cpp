@@ -78,30 +78,20 @@ void change(const PasswdRequest& request) {
               << " " << request.usersFile << ".\n";
 }
 
-/// What keeps a daemon of this configuration from asking the file, and how to change that.
+/// Says how a daemon of this configuration comes to ask the file.
 void adviseAfter(const PasswdRequest& request) {
-    namespace fs = std::filesystem;
-    const AuthenticationSettings& configured = request.configured;
-    const std::string file = fs::absolute(request.usersFile).lexically_normal();
-    std::string is, set, options;
-    const auto add = [](std::string& text, const char* separator, const std::string& part) {
-        text += (text.empty() ? "" : separator) + part;
+    const auto normal = [](const std::string& path) {
+        return std::filesystem::absolute(path).lexically_normal().string();
     };
-    if (configured.method != "users") {
-        add(is, "", "auth.method is \"" + configured.method + "\"");
-        add(set, "", "method = \"users\"");
-        add(options, "", "--auth-method users");
-    }
-    if (file != fs::absolute(configured.usersFile).lexically_normal()) {
-        add(is, " and ", "auth.users_file is \"" + configured.usersFile + "\"");
-        add(set, " and ", "users_file = \"" + file + "\"");
-        add(options, " ", "--auth-users-file " + file);
-    }
+    const AuthenticationSettings& configured = request.configured;
+    const std::string file = normal(request.usersFile);
     std::cout << "Reload a running quenx-cimd with: systemctl reload quenx-cimd (or send it SIGHUP)\n";
-    if (!is.empty()) {
-        std::cout << is << ", so this file is not used yet. Set " << set
-                  << " in [auth], or start quenx-cimd with " << options << ".\n";
-    }
+    if (configured.method == "users" && file == normal(configured.usersFile)) return;
+    std::cout << "This file is not used yet: auth.method is \"" << configured.method
+              << "\" and auth.users_file is \"" << configured.usersFile
+              << "\". Set method = \"users\" and users_file = \"" << file
+              << "\" in [auth], or start quenx-cimd with --auth-method users --auth-users-file " << file
+              << ".\n";
 }
 
 }  // namespace

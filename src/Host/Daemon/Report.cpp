@@ -36,6 +36,7 @@ void reportProblem(const std::string& text) {
 void notifyServiceManager(const std::string& state) {
     const char* path = std::getenv("NOTIFY_SOCKET");
     sockaddr_un address{};
+    // A path that is too long cannot be a socket's, and there is nobody to tell that.
     if (path == nullptr || std::strlen(path) >= sizeof address.sun_path) return;
     address.sun_family = AF_UNIX;
     const std::size_t length = std::strlen(path);

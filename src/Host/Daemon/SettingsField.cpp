@@ -19,6 +19,7 @@ struct Overloaded : Cases... {
 template <class... Cases>
 Overloaded(Cases...) -> Overloaded<Cases...>;
 
+/// The key as the file has it: --listen-http-port is told as listen.http_port, which either reader finds.
 [[noreturn]] void refuse(const SettingsField& field, const std::string& text, const std::string& right) {
     throw std::runtime_error(field.key + " is \"" + text + "\". It must be " + right + ".");
 }
@@ -71,6 +72,8 @@ std::string SettingsField::text() const {
         target);
 }
 
+// The help texts stand here and not in the header: they are what `quenx-cimd --help` prints. Bounds keep a
+// slip of the finger from taking the daemon's memory or from closing every connection at once.
 std::vector<SettingsField> fieldsOf(Settings& s) {
     return {{"listen.address", &s.listen.address, 0, 0, "address to listen on"},
             {"listen.https", &s.listen.https, 0, 0, "serve HTTPS"},
@@ -116,28 +119,23 @@ std::vector<SettingsField> fieldsOf(Settings& s) {
             {"daemon.lock_file", &s.lockFile, 0, 0, "file that is locked while quenx-cimd runs"}};
 }
 
-void checkSettings(const Settings& settings) {
-    if (!settings.listen.https && !settings.listen.http) {
-        throw std::runtime_error("listen.https and listen.http are both false. Set one of them to true.");
-    }
-    if (settings.authentication.method != "pam" && settings.authentication.method != "users") {
-        throw std::runtime_error("auth.method is \"" + settings.authentication.method +
-                                 "\". It must be \"pam\" or \"users\".");
-    }
-    if (settings.limits.anonymousBodyBytes > settings.limits.bodyBytes) {
-        throw std::runtime_error(
-            "limits.anonymous_body_bytes is larger than limits.body_bytes. Lower it, or raise "
-            "limits.body_bytes.");
-    }
-    if (settings.pulls.timeout > settings.pulls.maxTimeout) {
-        throw std::runtime_error(
-            "limits.enumeration_seconds is larger than limits.enumeration_most_seconds. Lower it, or raise "
-            "limits.enumeration_most_seconds.");
-    }
-    if (settings.adapters.empty() != settings.adapterState.empty()) {
-        throw std::runtime_error(
-            "Only one of adapters.description and adapters.state is set. Set both, or neither.");
-    }
+void checkSettings(const Settings& s) {
+    const auto refuseIf = [](bool isWrong, const std::string& text) {
+        if (isWrong) throw std::runtime_error(text);
+    };
+    const std::string& method = s.authentication.method;
+    refuseIf(!s.listen.https && !s.listen.http,
+             "listen.https and listen.http are both false. Set one of them to true.");
+    refuseIf(method != "pam" && method != "users",
+             "auth.method is \"" + method + "\". It must be \"pam\" or \"users\".");
+    refuseIf(s.limits.anonymousBodyBytes > s.limits.bodyBytes,
+             "limits.anonymous_body_bytes is larger than limits.body_bytes. Lower it, or raise "
+             "limits.body_bytes.");
+    refuseIf(s.pulls.timeout > s.pulls.maxTimeout,
+             "limits.enumeration_seconds is larger than limits.enumeration_most_seconds. Lower it, or raise "
+             "limits.enumeration_most_seconds.");
+    refuseIf(s.adapters.empty() != s.adapterState.empty(),
+             "Only one of adapters.description and adapters.state is set. Set both, or neither.");
 }
 
 }  // namespace host

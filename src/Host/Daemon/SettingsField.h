@@ -25,6 +25,7 @@ struct SettingsField {
 
     std::string option() const;
     bool isFlag() const { return std::holds_alternative<bool*>(target); }
+    bool isNumber() const { return !isFlag() && !isText(); }
     bool isText() const { return std::holds_alternative<std::string*>(target) || isList(); }
     bool isList() const { return std::holds_alternative<std::vector<std::string>*>(target); }
 

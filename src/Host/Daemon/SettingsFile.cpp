@@ -16,34 +16,25 @@ std::string placeOf(const std::string& file, const toml::source_region& source) 
     return file + ":" + std::to_string(source.begin.line);
 }
 
-std::string textOf(const toml::node& node, const std::string& place) {
-    if (const auto* text = node.as_string()) return text->get();
-    if (const auto* number = node.as_integer()) return std::to_string(number->get());
-    if (const auto* flag = node.as_boolean()) return flag->get() ? "true" : "false";
-    throw std::runtime_error(place + ": expected a text in quotes, a whole number, true or false");
+/// The text of a value of the field's kind, or of one element of its list.
+std::string textOf(const SettingsField& field, const toml::node& node) {
+    if (field.isText() && node.is_string()) return node.as_string()->get();
+    if (field.isFlag() && node.is_boolean()) return node.as_boolean()->get() ? "true" : "false";
+    if (field.isNumber() && node.is_integer()) return std::to_string(node.as_integer()->get());
+    throw std::runtime_error(field.key + " must be " +
+                             (field.isFlag()   ? "true or false"
+                              : field.isText() ? "a text in quotes"
+                                               : "a whole number"));
 }
 
-void checkKind(const SettingsField& field, const toml::node& node) {
-    const bool fits = field.isFlag()   ? node.is_boolean()
-                      : field.isText() ? node.is_string()
-                                       : node.is_integer();
-    if (!fits) {
-        throw std::runtime_error(field.key + " must be " +
-                                 (field.isFlag()   ? "true or false"
-                                  : field.isText() ? "a text in quotes"
-                                                   : "a whole number"));
-    }
-}
-
-void setList(const SettingsField& field, const toml::node& node, const std::string& place) {
+void setList(const SettingsField& field, const toml::node& node) {
+    // An empty list has to be able to take everybody off.
     std::get<std::vector<std::string>*>(field.target)->clear();
     const toml::array* elements = node.as_array();
     if (elements == nullptr)
         throw std::runtime_error(field.key + " must be a list of texts, such as [\"alice\"]");
-    for (const toml::node& element : *elements) {
-        checkKind(field, element);
-        field.set(textOf(element, place));
-    }
+    for (const toml::node& element : *elements)
+        field.set(textOf(field, element));
 }
 
 void setField(const std::vector<SettingsField>& fields, const std::string& key, const toml::node& node,
@@ -56,10 +47,9 @@ void setField(const std::vector<SettingsField>& fields, const std::string& key, 
     // What a field says of a wrong value knows nothing of files.
     try {
         if (field->isList()) {
-            setList(*field, node, place);
+            setList(*field, node);
         } else {
-            checkKind(*field, node);
-            field->set(textOf(node, place));
+            field->set(textOf(*field, node));
         }
     } catch (const std::runtime_error& error) {
         throw std::runtime_error(place + ": " + error.what());

@@ -126,30 +126,23 @@ core::ClassChain requireClass(core::CimOperations& target, const std::string& cl
 }
 
 IntrinsicResult getClass(const OperationContext& context, const Parameters& parameters) {
-    IntrinsicResult result;
-    result.kind = ResultKind::Classes;
     const core::ClassChain chain =
         requireClass(context.target, parameters.className("ClassName"), core::CimStatus::NotFound);
-    result.classes.push_back(answerOf(chain, optionsOf(parameters)));
-    return result;
+    return {.kind = ResultKind::Classes, .classes = {answerOf(chain, optionsOf(parameters))}};
 }
 
 IntrinsicResult enumerateClasses(const OperationContext& context, const Parameters& parameters) {
-    IntrinsicResult result;
-    result.kind = ResultKind::Classes;
+    IntrinsicResult result{.kind = ResultKind::Classes};
     const ClassOptions options = optionsOf(parameters);
-    for (const core::ClassChain& chain : wantedClasses(context, parameters)) {
+    for (const core::ClassChain& chain : wantedClasses(context, parameters))
         result.classes.push_back(answerOf(chain, options));
-    }
     return result;
 }
 
 IntrinsicResult enumerateClassNames(const OperationContext& context, const Parameters& parameters) {
-    IntrinsicResult result;
-    result.kind = ResultKind::ClassNames;
-    for (const core::ClassChain& chain : wantedClasses(context, parameters)) {
+    IntrinsicResult result{.kind = ResultKind::ClassNames};
+    for (const core::ClassChain& chain : wantedClasses(context, parameters))
         result.classNames.push_back(chain.front()->name);
-    }
     return result;
 }
 
@@ -158,20 +151,13 @@ IntrinsicResult enumerateClassNames(const OperationContext& context, const Param
 IntrinsicResult getQualifier(const OperationContext&, const Parameters& parameters) {
     const std::string name = parameters.text("QualifierName");
     const core::QualifierDeclaration* declaration = core::findQualifierDeclaration(name);
-    if (declaration == nullptr) {
+    if (declaration == nullptr)
         throw core::CimError(core::CimStatus::NotFound, "no qualifier \"" + name + "\"");
-    }
-    IntrinsicResult result;
-    result.kind = ResultKind::Qualifiers;
-    result.qualifiers = {*declaration};
-    return result;
+    return {.kind = ResultKind::Qualifiers, .qualifiers = {*declaration}};
 }
 
 IntrinsicResult enumerateQualifiers(const OperationContext&, const Parameters&) {
-    IntrinsicResult result;
-    result.kind = ResultKind::Qualifiers;
-    result.qualifiers = core::qualifierDeclarations();
-    return result;
+    return {.kind = ResultKind::Qualifiers, .qualifiers = core::qualifierDeclarations()};
 }
 
 }  // namespace host

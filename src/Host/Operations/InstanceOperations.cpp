@@ -41,9 +41,7 @@ std::map<std::string, std::string> originsOf(const core::ClassChain& chain) {
 
 IntrinsicResult instancesResult(const OperationContext& context, const Parameters& parameters,
                                 ResultKind kind, std::vector<core::InstanceValue> instances) {
-    IntrinsicResult result;
-    result.kind = kind;
-    result.instances = std::move(instances);
+    IntrinsicResult result{.kind = kind, .instances = std::move(instances)};
     if (!parameters.flag("IncludeClassOrigin", false)) return result;
     // By class, since a list may hold thousands of instances of a few classes.
     auto origins = std::make_shared<cimxml::Origins>();
@@ -53,13 +51,6 @@ IntrinsicResult instancesResult(const OperationContext& context, const Parameter
         if (isNew) entry->second = originsOf(context.target.getClass(name));
     }
     result.origins = std::move(origins);
-    return result;
-}
-
-IntrinsicResult pathsResult(ResultKind kind, std::vector<core::CimPath> paths) {
-    IntrinsicResult result;
-    result.kind = kind;
-    result.paths = std::move(paths);
     return result;
 }
 
@@ -96,8 +87,8 @@ IntrinsicResult enumerateInstances(const OperationContext& context, const Parame
 }
 
 IntrinsicResult enumerateInstanceNames(const OperationContext& context, const Parameters& parameters) {
-    return pathsResult(ResultKind::InstanceNames,
-                       context.target.enumerateInstanceNames(parameters.className("ClassName")));
+    return {.kind = ResultKind::InstanceNames,
+            .paths = context.target.enumerateInstanceNames(parameters.className("ClassName"))};
 }
 
 IntrinsicResult deleteInstance(const OperationContext& context, const Parameters& parameters) {
@@ -131,7 +122,8 @@ IntrinsicResult associators(const OperationContext& context, const Parameters& p
 
 IntrinsicResult associatorNames(const OperationContext& context, const Parameters& parameters) {
     const core::CimPath source = sourceOf(context, parameters);
-    return pathsResult(ResultKind::ObjectPaths, context.target.associatorNames(source, filterOf(parameters)));
+    return {.kind = ResultKind::ObjectPaths,
+            .paths = context.target.associatorNames(source, filterOf(parameters))};
 }
 
 IntrinsicResult references(const OperationContext& context, const Parameters& parameters) {
@@ -143,7 +135,8 @@ IntrinsicResult references(const OperationContext& context, const Parameters& pa
 
 IntrinsicResult referenceNames(const OperationContext& context, const Parameters& parameters) {
     const core::CimPath source = sourceOf(context, parameters);
-    return pathsResult(ResultKind::ObjectPaths, context.target.referenceNames(source, filterOf(parameters)));
+    return {.kind = ResultKind::ObjectPaths,
+            .paths = context.target.referenceNames(source, filterOf(parameters))};
 }
 
 }  // namespace host

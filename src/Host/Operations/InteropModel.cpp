@@ -13,6 +13,7 @@ using core::PropertyDeclaration;
 
 constexpr const char* kManager = "CIM_ObjectManager";
 constexpr const char* kNamespace = "CIM_Namespace";
+// Part of the path of CIM_ObjectManager, so it stays what it is.
 constexpr const char* kManagerName = "quenx-cimd";
 
 PropertyDeclaration property(const char* name, CimType type) {
@@ -91,7 +92,7 @@ core::InstanceValue objectManager(const std::string& systemName) {
 }
 
 core::InstanceValue namespaceInstance(const std::string& systemName, const std::string& name) {
-    constexpr std::uint64_t kUnknownClasses = 0;
+    constexpr std::uint64_t kUnknownClasses = 0;  // deprecated in the schema, but still required
     return makeInstance(kNamespace,
                         {{"SystemCreationClassName", "CIM_ComputerSystem"},
                          {"SystemName", systemName},

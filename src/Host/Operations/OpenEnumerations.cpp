@@ -19,6 +19,10 @@ using core::CimStatus;
 using core::CimType;
 using core::CimValue;
 
+[[noreturn]] void refuseContext() {
+    throw CimError(CimStatus::InvalidEnumerationContext, "no enumeration of that context is open");
+}
+
 /// A name that nobody can guess: whoever knows it and the user can read what is left.
 std::string newContext() {
     std::array<unsigned char, 16> bytes{};
@@ -41,9 +45,7 @@ void takeLast(std::vector<T>& from, std::vector<T>& to, std::size_t count) {
 
 /// The next objects of what is left; the outputs are still missing.
 IntrinsicResult takeNext(IntrinsicResult& rest, std::size_t count) {
-    IntrinsicResult part;
-    part.kind = rest.kind;
-    part.origins = rest.origins;
+    IntrinsicResult part{.kind = rest.kind, .origins = rest.origins};
     takeLast(rest.instances, part.instances, count);
     takeLast(rest.paths, part.paths, count);
     return part;
@@ -75,22 +77,19 @@ void OpenEnumerations::dropExpired() {
 }
 
 OpenEnumerations::Entries::iterator OpenEnumerations::find(const EnumerationOwner& owner,
-                                                           const std::string& context, bool anyKind) {
+                                                           const std::string& context) {
     dropExpired();
     const auto found = m_entries.find(context);
     // Somebody else's context is answered as an unknown one, which tells nothing.
-    if (found != m_entries.end()) {
-        EnumerationOwner wanted = owner;
-        if (anyKind) wanted.kind = found->second.owner.kind;
-        if (found->second.owner == wanted) return found;
-    }
-    throw CimError(CimStatus::InvalidEnumerationContext, "no enumeration of that context is open");
+    if (found == m_entries.end() || found->second.owner != owner) refuseContext();
+    return found;
 }
 
 IntrinsicResult OpenEnumerations::open(const EnumerationOwner& owner, IntrinsicResult result,
                                        std::size_t count, std::optional<std::uint32_t> timeoutSeconds) {
     const std::chrono::seconds timeout = checkedTimeout(timeoutSeconds);
-    // Taken from the end, so that each pull costs what it delivers and frees it.
+    // The rest is kept in the reverse order and taken from its end, so that each pull costs what it delivers
+    // and frees it.
     std::reverse(result.instances.begin(), result.instances.end());
     std::reverse(result.paths.begin(), result.paths.end());
     IntrinsicResult part = takeNext(result, count);
@@ -101,6 +100,7 @@ IntrinsicResult OpenEnumerations::open(const EnumerationOwner& owner, IntrinsicR
     // A result that fits into the first answer is never kept, and counts against no limit.
     const std::string context = newContext();
     const utils::Mutex::AutoLocker lock(m_mutex);
+    // Checked last, when the work is done: it is the memory of what is left that has to be bounded.
     dropExpired();
     if (m_entries.size() >= m_limits.open) {
         throw CimError(CimStatus::ServerLimitsExceeded, "too many enumerations are open");
@@ -110,16 +110,18 @@ IntrinsicResult OpenEnumerations::open(const EnumerationOwner& owner, IntrinsicR
     return part;
 }
 
-IntrinsicResult OpenEnumerations::pull(const EnumerationOwner& owner, const std::string& context,
-                                       std::size_t count) {
+IntrinsicResult OpenEnumerations::pull(const EnumerationOwner& owner, cimxml::ResultKind kind,
+                                       const std::string& context, std::size_t count) {
     const utils::Mutex::AutoLocker lock(m_mutex);
-    const auto found = find(owner, context, false);
+    const auto found = find(owner, context);
+    if (found->second.rest.kind != kind) refuseContext();
     IntrinsicResult part = takeNext(found->second.rest, count);
     const bool ended = isEmpty(found->second.rest);
     addOutputs(part, ended, ended ? "" : context);
     if (ended) {
         m_entries.erase(found);
     } else {
+        // The time counts anew with each pull: a client that goes on reading is never cut off.
         found->second.expires = Clock::now() + found->second.timeout;
     }
     return part;
@@ -127,7 +129,7 @@ IntrinsicResult OpenEnumerations::pull(const EnumerationOwner& owner, const std:
 
 void OpenEnumerations::close(const EnumerationOwner& owner, const std::string& context) {
     const utils::Mutex::AutoLocker lock(m_mutex);
-    m_entries.erase(find(owner, context, true));
+    m_entries.erase(find(owner, context));
 }
 
 }  // namespace host

@@ -12,11 +12,10 @@
 
 namespace host {
 
-/// Who may pull on an enumeration, and how.
+/// Who may pull on an enumeration.
 struct EnumerationOwner {
     std::string namespaceName;  ///< folded
     std::string user;
-    cimxml::ResultKind kind = cimxml::ResultKind::Nothing;
 
     bool operator==(const EnumerationOwner&) const = default;
 };
@@ -34,10 +33,10 @@ class OpenEnumerations {
     /// of range.
     cimxml::IntrinsicResult open(const EnumerationOwner& owner, cimxml::IntrinsicResult result,
                                  std::size_t count, std::optional<std::uint32_t> timeoutSeconds);
-    /// The next ones. Invalid enumeration context for one that is unknown, ended, timed out, or somebody
-    /// else's.
-    cimxml::IntrinsicResult pull(const EnumerationOwner& owner, const std::string& context,
-                                 std::size_t count);
+    /// The next ones. Invalid enumeration context for one that is unknown, ended, timed out, of another kind,
+    /// or somebody else's.
+    cimxml::IntrinsicResult pull(const EnumerationOwner& owner, cimxml::ResultKind kind,
+                                 const std::string& context, std::size_t count);
     /// Lets go of an enumeration, of whichever kind.
     void close(const EnumerationOwner& owner, const std::string& context);
 
@@ -52,8 +51,7 @@ class OpenEnumerations {
 
     std::chrono::seconds checkedTimeout(std::optional<std::uint32_t> seconds) const;
     void dropExpired() QUENX_REQUIRES(m_mutex);
-    Entries::iterator find(const EnumerationOwner& owner, const std::string& context, bool anyKind)
-        QUENX_REQUIRES(m_mutex);
+    Entries::iterator find(const EnumerationOwner& owner, const std::string& context) QUENX_REQUIRES(m_mutex);
 
     const PullLimits m_limits;
     utils::Mutex m_mutex;

@@ -44,8 +44,8 @@ std::vector<ParameterSpec> opening(std::vector<ParameterSpec> own) {
     return own;
 }
 
-EnumerationOwner ownerOf(const OperationContext& context, ResultKind kind) {
-    return {core::foldName(context.target.getNamespace()), context.caller.user, kind};
+EnumerationOwner ownerOf(const OperationContext& context) {
+    return {core::foldName(context.target.getNamespace()), context.caller.user};
 }
 
 std::size_t countOf(const Parameters& parameters) {
@@ -63,18 +63,18 @@ IntrinsicResult open(const OperationContext& context, const Parameters& paramete
     }
     IntrinsicResult result = handler(context, parameters);
     result.kind = kind;
-    return context.enumerations.open(ownerOf(context, kind), std::move(result), countOf(parameters),
+    return context.enumerations.open(ownerOf(context), std::move(result), countOf(parameters),
                                      parameters.number("OperationTimeout"));
 }
 
 template <ResultKind kind>
 IntrinsicResult pull(const OperationContext& context, const Parameters& parameters) {
-    return context.enumerations.pull(ownerOf(context, kind), parameters.text(kContext.name),
+    return context.enumerations.pull(ownerOf(context), kind, parameters.text(kContext.name),
                                      countOf(parameters));
 }
 
 IntrinsicResult close(const OperationContext& context, const Parameters& parameters) {
-    context.enumerations.close(ownerOf(context, ResultKind::Nothing), parameters.text(kContext.name));
+    context.enumerations.close(ownerOf(context), parameters.text(kContext.name));
     return {};
 }
 

@@ -2,7 +2,6 @@
 #include "Host/Server/HttpServer.h"
 
 #include <microhttpd.h>
-#include <netinet/in.h>
 #include <unistd.h>
 
 #include <cstdarg>
@@ -18,6 +17,7 @@ namespace host {
 
 namespace {
 
+// The older versions of TLS are out of use (RFC 8996).
 constexpr const char* kTlsPriorities = "NORMAL:-VERS-ALL:+VERS-TLS1.3:+VERS-TLS1.2";
 
 /// What the function below shows; old ones live as long as their server.
@@ -32,14 +32,6 @@ int retrieveCertificate(gnutls_session_t, const gnutls_datum_t*, int, const gnut
     *length = certificate->length();
     *key = certificate->key();
     return 0;
-}
-
-std::uint16_t portOf(int socket) {
-    sockaddr_storage address{};
-    socklen_t length = sizeof address;
-    ::getsockname(socket, reinterpret_cast<sockaddr*>(&address), &length);
-    // The port is at the same place in both families.
-    return ntohs(reinterpret_cast<const sockaddr_in*>(&address)->sin_port);
 }
 
 int socketOf(MHD_Connection* connection) {
@@ -69,9 +61,10 @@ struct HttpServer::Callbacks {
             auto& request = *static_cast<HttpRequest*>(*state);
             if (*size == 0) return request.finish();
             request.take(data, *size);
-            *size = 0;
+            *size = 0;  // tells the library that all of it was taken
             return MHD_YES;
         } catch (const std::exception& error) {
+            // Most likely there is no memory, so none is asked for in order to answer: the connection ends.
             QUENX_ERROR("a request failed: %s", error.what());
             return MHD_NO;
         }
@@ -123,7 +116,6 @@ std::uint16_t HttpServer::listen(const std::string& address, std::uint16_t port,
                                     MHD_USE_POLL | MHD_USE_ITC | MHD_USE_ERROR_LOG;
     const unsigned int flags = tls ? kFlags | MHD_USE_TLS : kFlags;
     const int socket = openListener(address, port);
-    const std::uint16_t actualPort = portOf(socket);
     // The logger comes first, so that complaints about the others reach it.
     std::vector<MHD_OptionItem> options{
         {MHD_OPTION_EXTERNAL_LOGGER, reinterpret_cast<intptr_t>(&logLibrary), nullptr},
@@ -135,17 +127,18 @@ std::uint16_t HttpServer::listen(const std::string& address, std::uint16_t port,
         {MHD_OPTION_CONNECTION_TIMEOUT, static_cast<intptr_t>(m_limits.idleTime.count()), nullptr},
         {MHD_OPTION_CONNECTION_MEMORY_LIMIT, static_cast<intptr_t>(m_limits.headerBytes), nullptr},
         {MHD_OPTION_STRICT_FOR_CLIENT, 1, nullptr}};
+    // Certificate and key by a function, not by their text, so that SIGHUP can put others in their place.
     if (tls) {
         options.push_back({MHD_OPTION_HTTPS_CERT_CALLBACK, 0, reinterpret_cast<void*>(&retrieveCertificate)});
         options.push_back({MHD_OPTION_HTTPS_PRIORITIES, 0, const_cast<char*>(kTlsPriorities)});
     }
     options.push_back({MHD_OPTION_END, 0, nullptr});
-    MHD_Daemon* daemon = ::MHD_start_daemon(flags, actualPort, nullptr, nullptr, &Callbacks::request, this,
+    MHD_Daemon* daemon = ::MHD_start_daemon(flags, port, nullptr, nullptr, &Callbacks::request, this,
                                             MHD_OPTION_ARRAY, options.data(), MHD_OPTION_END);
     if (daemon == nullptr)
         throw std::runtime_error("Cannot start the HTTP server. The system log says more.");
     m_daemons.push_back(daemon);
-    return actualPort;
+    return ::MHD_get_daemon_info(daemon, MHD_DAEMON_INFO_BIND_PORT)->port;
 }
 
 void HttpServer::stopAccepting() {

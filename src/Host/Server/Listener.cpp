@@ -1,6 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-#include <arpa/inet.h>
-#include <netinet/in.h>
+#include <netdb.h>
 #include <sys/socket.h>
 #include <unistd.h>
 
@@ -13,30 +12,22 @@ namespace host {
 
 namespace {
 
-struct SocketAddress {
-    sockaddr_storage storage{};
-    socklen_t length = 0;
+struct Free {
+    void operator()(addrinfo* list) const { ::freeaddrinfo(list); }
 };
 
-SocketAddress addressOf(const std::string& text, std::uint16_t port) {
-    SocketAddress address;
-    auto* four = reinterpret_cast<sockaddr_in*>(&address.storage);
-    auto* six = reinterpret_cast<sockaddr_in6*>(&address.storage);
-    if (::inet_pton(AF_INET, text.c_str(), &four->sin_addr) == 1) {
-        four->sin_family = AF_INET;
-        four->sin_port = htons(port);
-        address.length = sizeof *four;
-    } else if (::inet_pton(AF_INET6, text.c_str(), &six->sin6_addr) == 1) {
-        six->sin6_family = AF_INET6;
-        six->sin6_port = htons(port);
-        address.length = sizeof *six;
-    } else {
-        throw ListenError(
-            "listen.address is \"" + text +
-                "\". It must be an IPv4 or IPv6 address such as 127.0.0.1, or 0.0.0.0 or :: for all.",
-            EINVAL);
-    }
-    return address;
+std::unique_ptr<addrinfo, Free> addressOf(const std::string& text, std::uint16_t port) {
+    addrinfo hints{};
+    // Names are not looked up: which of a name's addresses would be listened on is nothing to guess.
+    hints.ai_flags = AI_NUMERICHOST | AI_NUMERICSERV;
+    hints.ai_socktype = SOCK_STREAM;
+    addrinfo* found = nullptr;
+    if (::getaddrinfo(text.c_str(), std::to_string(port).c_str(), &hints, &found) == 0)
+        return std::unique_ptr<addrinfo, Free>(found);
+    throw ListenError(
+        "listen.address is \"" + text +
+            "\". It must be an IPv4 or IPv6 address such as 127.0.0.1, or 0.0.0.0 or :: for all.",
+        EINVAL);
 }
 
 const char* adviceFor(int error) {
@@ -55,12 +46,12 @@ const char* adviceFor(int error) {
 }  // namespace
 
 int openListener(const std::string& address, std::uint16_t port) {
-    const SocketAddress place = addressOf(address, port);
-    const int socket = ::socket(place.storage.ss_family, SOCK_STREAM | SOCK_CLOEXEC | SOCK_NONBLOCK, 0);
+    const auto place = addressOf(address, port);
+    const int socket = ::socket(place->ai_family, SOCK_STREAM | SOCK_CLOEXEC | SOCK_NONBLOCK, 0);
     const int yes = 1;
     // Without it a restart would fail as long as connections of the last run are in the state TIME_WAIT.
     if (socket >= 0) ::setsockopt(socket, SOL_SOCKET, SO_REUSEADDR, &yes, sizeof yes);
-    if (socket < 0 || ::bind(socket, reinterpret_cast<const sockaddr*>(&place.storage), place.length) != 0 ||
+    if (socket < 0 || ::bind(socket, place->ai_addr, place->ai_addrlen) != 0 ||
         ::listen(socket, SOMAXCONN) != 0) {
         const int error = errno;
         if (socket >= 0) ::close(socket);
