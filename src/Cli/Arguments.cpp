@@ -289,7 +289,7 @@ std::optional<Arguments> readArguments(int argc, char** argv) {
         printHelp(app, helpOf);
         return std::nullopt;
     }
-    // The library can forbid two options at once, but not ask for one of the two.
+    // The library can exclude one option by another, but not require one of two.
     const ImageOptions& image = arguments.options.image;
     const bool takesImage = arguments.verb == install || arguments.verb == check;
     if (takesImage && image.image.empty() == image.identity.empty()) {

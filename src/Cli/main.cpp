@@ -119,7 +119,8 @@ ExitStatus runAndReport(int argc, char** argv, std::optional<Arguments>& argumen
 int main(int argc, char** argv) {
     std::optional<cli::Arguments> arguments;
     cli::ExitStatus status = cli::runAndReport(argc, argv, arguments);
-    // A result that nobody could read is none; an update, though, is done whoever reads of it.
+    // A result that nobody can read is a failure; an update, though, has happened whether or not anybody
+    // reads about it.
     const bool mayHaveUpdated = arguments && arguments->startsUpdate();
     if (!std::cout.flush() && !mayHaveUpdated && status == cli::ExitStatus::Done) {
         std::cerr << "quenxctl: Cannot write the output.\n";

@@ -83,7 +83,7 @@ TEST(ProgressTest, FitsTheWidthAndSaysNoMoreThanItKnows) {
     EXPECT_EQ(cli::durationText(seconds(3723)), "1:02:03");
 }
 
-/// What a display puts out that is no terminal, told of these percentages, a second apart.
+/// What a display writes into a file when it sees these percentages, a second apart.
 std::string show(const std::vector<unsigned>& percentages) {
     std::ostringstream out;
     cli::LinePrinter printer(out, {});

@@ -97,7 +97,7 @@ class FakeService : public core::CimOperations {
 
 class InstallVerbTest : public ::testing::Test {
   protected:
-    /// Runs it anew. What it printed stays to be looked at.
+    /// Forgets what the last run printed, and runs it.
     ExitStatus install() {
         for (std::ostringstream* stream : {&m_out, &m_error, &m_lines})
             stream->str("");
@@ -133,7 +133,7 @@ TEST_F(InstallVerbTest, FollowsTheJobOverABrokenConnection) {
     m_service->installed = kOld;
     try {
         install();
-        ADD_FAILURE() << "waits for ever";
+        ADD_FAILURE() << "waits forever";
     } catch (const cli::CommandError& error) {
         EXPECT_TRUE(error.advice().starts_with("The update may still be running: \"quenxctl jobs\" shows"));
     }
@@ -163,9 +163,8 @@ TEST_F(InstallVerbTest, SaysAfterAFailureOnlyWhatWasReadBack) {
         std::string advice;
     } rows[] = {
         {kOld, true, "cannot make the folder /x: Permission denied",
-         "It keeps its old firmware. Run quenxctl as root, or name a folder of yours with --adapters FILE "
-         "--state DIR.\n"},
-        {kOld, true, "flash gone", "It keeps its old firmware.\n"},
+         "It keeps its old firmware. Run quenxctl as root, or name a folder of your own with --adapters "
+         "FILE --state DIR.\n"},
         {{component("IMG_PXE", 2), kOld[1]}, true, "flash gone", "It now has IMG_PXE 2, IMG_UEFI 0.\n"},
         {kOld, false, "flash gone", ""},
     };

@@ -26,15 +26,15 @@ struct ProviderSettings {
     std::string directory;           ///< where the provider libraries are
 };
 
-/// Loads the providers into this process. Throws CommandError when a file or library cannot be had, naming
-/// it.
+/// Loads the providers into this process. Throws CommandError, naming the file, when one cannot be
+/// read or loaded.
 Connection openProviders(const ProviderSettings& settings);
 
 /// The address of a CIM-XML server, whole: scheme, host, port and path.
 class ServerUrl {
   public:
     /// Reads "https://host", with a port and a path that may be left out. Throws CommandError that says how
-    /// to write it: a user who mistypes it shall not send a password in clear, or to another host.
+    /// to write it: a user who mistypes it must not send a password in clear, or to another host.
     explicit ServerUrl(const std::string& text);
 
     const std::string& text() const { return m_text; }

@@ -123,7 +123,7 @@ HttpClient::HttpClient(const ServerSettings& settings, const std::string& user, 
     set(CURLOPT_TIMEOUT, kAnswerSeconds);
     set(CURLOPT_WRITEFUNCTION, &takeBody);
     set(CURLOPT_HEADERFUNCTION, &takeHeader);
-    // The one scheme that every WBEM server has; named, it is sent at once and not after a first refusal.
+    // The one scheme that every WBEM server has. Naming it saves a first request that would be refused.
     set(CURLOPT_HTTPAUTH, CURLAUTH_BASIC);
     set(CURLOPT_USERNAME, user.c_str());
     set(CURLOPT_PASSWORD, password.c_str());
@@ -155,7 +155,7 @@ HttpReply HttpClient::post(const std::vector<std::string>& headers, const std::s
 }
 
 void HttpClient::refuse(CURLcode code) const {
-    // Where the system has no file of certificates either, the user has named no bad one: nobody is trusted.
+    // Without --cacert it is the system that has no certificates, so the user did not name a bad file.
     if (code == CURLE_SSL_CACERT_BADFILE && !m_namesCaFile) code = CURLE_PEER_FAILED_VERIFICATION;
     const std::string reason = m_error.front() == '\0' ? curl_easy_strerror(code) : m_error.data();
     throw CommandError(code == CURLE_SSL_CACERT_BADFILE ? ExitStatus::WrongUse : ExitStatus::Failed,

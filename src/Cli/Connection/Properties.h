@@ -31,7 +31,7 @@ inline std::uint64_t numberOf(const core::InstanceValue& instance, std::string_v
     return valueOf<std::uint64_t>(instance, name).value_or(0);
 }
 
-/// The elements of an array of strings; none where the property is no such array.
+/// The elements of an array of strings; none where the property is anything else.
 inline std::vector<std::string> textsOf(const core::InstanceValue& instance, std::string_view name) {
     const core::PropertyValue* property = instance.find(name);
     std::vector<std::string> texts;

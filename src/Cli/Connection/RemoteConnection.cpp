@@ -231,7 +231,7 @@ std::vector<core::ClassChain> RemoteOperations::enumerateClasses(const std::stri
 /// The line that the user answers with. Throws CommandError with these texts where nobody can answer.
 std::string ask(const std::string& prompt, const std::string& missing, const std::string& advice) {
     std::string line;
-    // In a script or a service nobody would answer, and the program would wait for ever.
+    // In a script or a service nobody would answer, and the program would wait forever.
     if (isatty(STDIN_FILENO) == 1) {
         std::cerr << prompt << std::flush;
         if (std::getline(std::cin, line) && !line.empty()) return line;

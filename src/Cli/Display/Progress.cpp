@@ -15,7 +15,7 @@ namespace {
 constexpr unsigned kLineEveryPercent = 10;
 constexpr std::chrono::seconds kLineAtLeastEvery{10};
 
-/// Percent a millisecond. Nothing while there is too little to tell from: an estimate that jumps about is
+/// Percent per millisecond. Nothing as long as there is too little to go by: an estimate that jumps about is
 /// worse than none.
 std::optional<double> speedOf(const UpdateProgress& progress) {
     constexpr std::chrono::milliseconds kEnough{300};
@@ -23,7 +23,7 @@ std::optional<double> speedOf(const UpdateProgress& progress) {
     return (progress.percent - progress.percentAtStart) / static_cast<double>(progress.elapsed.count());
 }
 
-/// What there is to say beside the percentage, the most useful first.
+/// What there is to say besides the percentage, the most useful first.
 std::vector<std::string> details(const UpdateProgress& progress) {
     std::vector<std::string> parts;
     if (progress.bytes != 0) {
@@ -58,7 +58,7 @@ std::string barText(const UpdateProgress& progress, std::size_t width) {
     const std::string head = printable(progress.adapter) + "  ";
     std::string tail = utils::formatStr(" %3u %%", progress.percent);
     for (const std::string& part : details(progress)) {
-        // What does not fit beside the shortest bar is left out.
+        // What does not fit next to the shortest bar is left out.
         if (columnsOf(head) + kLeastBar + 2 + tail.size() + 2 + part.size() > width) break;
         tail += "  " + part;
     }
@@ -98,7 +98,7 @@ ProgressDisplay::ProgressDisplay(LinePrinter& printer, Clock clock)
 void ProgressDisplay::started(const std::string& adapter, std::uint64_t bytes) {
     m_progress = {adapter, 0, bytes, std::chrono::milliseconds(0), 0};
     m_movesSince.reset();
-    // A log shows at once what the program waits for; a bar comes with the first look.
+    // A log says right away what the program waits for; a bar appears with the first look at the job.
     if (!m_printer.canRewrite()) showLine(m_clock());
 }
 
@@ -124,7 +124,7 @@ void ProgressDisplay::progressed(unsigned percent) {
 
 void ProgressDisplay::showLine(std::chrono::steady_clock::time_point now) {
     m_printer.print(lineText(m_progress));
-    // Rounded down, so that lines come at 10, 20, 30 at whatever moments the job was looked at.
+    // Rounded down, so that lines come at about 10, 20 and 30, however the looks at the job happen to fall.
     m_lastLine = m_progress.percent - m_progress.percent % kLineEveryPercent;
     m_lastLineAt = now;
 }

@@ -12,7 +12,7 @@ namespace cli {
 /// terminal.
 std::string printable(std::string_view text);
 
-/// The columns that a UTF-8 text takes, each character one; bytes that are no UTF-8 count as one each.
+/// The columns that a UTF-8 text takes, each character one; bytes that are not UTF-8 count as one each.
 std::size_t columnsOf(std::string_view text);
 
 /// The text cut in the middle to at most `width` columns, "..." in the place of what is left out.
@@ -26,7 +26,7 @@ struct Terminal {
     int descriptor = -1;
 
     static Terminal of(int descriptor);
-    /// In columns; 80 when it cannot be had.
+    /// In columns; 80 when the terminal does not say.
     std::size_t width() const;
 };
 
@@ -35,7 +35,7 @@ struct Terminal {
 class LinePrinter {
   public:
     LinePrinter(std::ostream& out, Terminal terminal) : m_out(out), m_terminal(terminal) {}
-    /// Leaves the bottom line where it is, with a line end behind it.
+    /// Leaves the bottom line where it is and ends it.
     ~LinePrinter() { keep(); }
     LinePrinter(const LinePrinter&) = delete;
     LinePrinter& operator=(const LinePrinter&) = delete;

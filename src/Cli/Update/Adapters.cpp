@@ -52,6 +52,7 @@ std::optional<std::uint32_t> versionOf(const std::vector<Component>& components,
 std::string componentsText(const std::vector<Component>& components) {
     if (components.empty()) return "nothing";
     std::vector<std::string> texts;
+    texts.reserve(components.size());
     for (const Component& component : components)
         texts.push_back(component.type + " " + std::to_string(component.version));
     return joined(texts);

@@ -62,7 +62,7 @@ bool carries(const ma::RomImage& image, const std::string& type) {
 std::string uriScheme(std::string_view uri) {
     const auto colon = uri.find(':');
     if (colon == std::string_view::npos || colon == 0 || !utils::isLetter(uri.front())) return {};
-    const std::string scheme = utils::lowerCase(uri.substr(0, colon));
+    std::string scheme = utils::lowerCase(uri.substr(0, colon));
     if (!std::all_of(scheme.begin(), scheme.end(), isSchemeCharacter)) return {};
     return scheme;
 }
@@ -88,7 +88,7 @@ ImageFile readImage(const std::string& path) try {
     ImageFile image{path, std::nullopt, {}};
     struct stat info = {};
     if (stat(path.c_str(), &info) != 0) throw std::system_error(errno, std::generic_category());
-    // Looked at before it is opened: opening a pipe would wait for whoever writes into it.
+    // Checked before it is opened: opening a pipe would wait for somebody to write into it.
     if (const std::string why = kindProblem(info); !why.empty()) {
         image.problem = notAnImage(path, why);
         return image;

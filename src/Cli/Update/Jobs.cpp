@@ -50,7 +50,7 @@ JobView viewOf(const core::InstanceValue& job) {
 }
 
 JobView lookAt(core::CimOperations& operations, const core::CimPath& job, const Following& following) {
-    // A connection can break, and the update goes on all the same: so many looks in a row may fail.
+    // The update goes on when a connection breaks, so several looks in a row may fail.
     constexpr unsigned kMostFailures = 20;
     for (unsigned failures = 1;; ++failures) {
         try {

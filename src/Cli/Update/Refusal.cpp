@@ -9,7 +9,7 @@ namespace cli {
 
 namespace {
 
-/// Nothing where there is no better explanation than what the return value means.
+/// Nothing where the return value's meaning is the best explanation.
 using Reason = std::optional<Explanation>;
 
 constexpr const char* kAskLog =
@@ -38,7 +38,7 @@ constexpr ReturnValueText kReturnValues[] = {
     {4098, "The service cannot install unattended.", "Install with the adapter maker's own tool."},
     {4099, "The image is older than the installed firmware, or has other image types.",
      "Use a newer image, or install this one with --force."},
-    {4100, "The service ran out of memory or into an unexpected error.", kAskLog},
+    {4100, "The service ran out of memory or met an unexpected error.", kAskLog},
     {4101, "The service has too little swap space.", "Free some memory and try again."},
     {4102, "The service cannot update the installed version to this one.",
      "Install a version in between first."},
@@ -70,7 +70,7 @@ Reason explainHiddenHolder(std::uint32_t returnValue, const Candidate& candidate
         return Explanation{"The server refuses " + name + ", although no job is running" + kHolder,
                            kWaitOrRestart};
     }
-    // A file that is no image explains the answer without anybody who holds the adapter.
+    // A file that is not an image explains the answer by itself.
     if (candidate.image && candidate.image->problem) return std::nullopt;
     return Explanation{"The server could not read or prepare the image, or another adapter than " + name +
                            " is in use" + kHolder,
@@ -127,7 +127,7 @@ std::string getImageFor(const Adapter& adapter) {
 
 Reason explainUnsupported(const Candidate& candidate) {
     const Adapter& adapter = candidate.adapter;
-    // First of all: no image at all will do for such an adapter.
+    // First of all: such an adapter takes no image, whatever its ids.
     if (!adapter.updatable) {
         return Explanation{"The firmware of " + adapter.name + " cannot be updated.",
                            "\"quenxctl adapters\" shows which adapters can be updated."};
@@ -235,7 +235,7 @@ std::string permissionAdvice(const std::string& reason) {
     // The job only carries the text that the adapter API made of the error.
     for (const int error : {EACCES, EPERM, EROFS}) {
         if (reason.find(std::generic_category().message(error)) != std::string::npos)
-            return "Run quenxctl as root, or name a folder of yours with --adapters FILE --state DIR.";
+            return "Run quenxctl as root, or name a folder of your own with --adapters FILE --state DIR.";
     }
     return {};
 }

@@ -86,7 +86,7 @@ std::optional<std::uint32_t> verifyOnly(const Connection& connection, const Cand
             .returnValue;
     }
     if (!connection.runsJobs) return std::nullopt;
-    // Not a method of the profile: the service in this process is asked behind the model's back.
+    // No method of the model does this; the service's own interface in this process does.
     const core::RequestScope scope;
     auto* check = dynamic_cast<update::ImageCheck*>(core::GetCimBroker()->getInstanceByPath(service));
     if (check == nullptr) return std::nullopt;

@@ -109,7 +109,7 @@ void judgeJob(const Connection& connection, Outcome& outcome, const Candidate& c
     } else if (!isInPlace(candidate, outcome.after)) {
         outcome.end("failed", {"The update of " + name + " ended without an error, but " + name + " has " +
                                    componentsText(outcome.after) + ", not what the image has.",
-                               "Look into the system log, then install again with --force."});
+                               "Check the system log, then install again with --force."});
     } else {
         const bool wasCurrent = candidate.comparison && candidate.comparison->current;
         outcome.end(ExitStatus::Done, "updated",
@@ -119,8 +119,8 @@ void judgeJob(const Connection& connection, Outcome& outcome, const Candidate& c
     }
 }
 
-/// What the adapter carries after the update. Nothing where that cannot be read: the job's end is worth
-/// reporting all the same.
+/// What the adapter carries after the update. Nothing where that cannot be read: how the job ended is still
+/// worth reporting.
 std::vector<Component> readBack(core::CimOperations& operations, const Candidate& candidate) {
     try {
         return readComponents(operations, candidate.adapter.path);

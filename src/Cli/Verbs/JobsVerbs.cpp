@@ -26,7 +26,7 @@ std::string orDash(const std::string& text) {
 
 /// "2026-11-21 20:10:33" in the local time zone; "-" for none.
 std::string startText(const JobView& job) {
-    if (!job.start || job.start->isPeriod()) return "-";  // an interval is no moment
+    if (!job.start || job.start->isPeriod()) return "-";  // an interval, not a moment
     const auto seconds = static_cast<std::time_t>(job.start->getSeconds());
     std::tm local{};
     std::array<char, sizeof "9999-12-31 23:59:59"> text{};
@@ -34,7 +34,7 @@ std::string startText(const JobView& job) {
     return {text.data(), std::strftime(text.data(), text.size(), "%Y-%m-%d %H:%M:%S", &local)};
 }
 
-/// The users have a column where the service tells of one at least.
+/// There is a column for the users if the service names at least one.
 void printJobs(std::ostream& out, const std::vector<JobView>& jobs) {
     const bool hasUsers =
         std::any_of(jobs.begin(), jobs.end(), [](const JobView& job) { return !job.user.empty(); });

@@ -56,7 +56,7 @@ std::string declarationText(const core::QualifierDeclaration& declaration) {
     return text;
 }
 
-/// "TYPE Name[]" of a property or parameter, behind its qualifiers.
+/// The qualifiers of a property or parameter, then "TYPE Name[]".
 template <class Declaration>
 std::string elementText(const Declaration& element, const std::string& indent) {
     std::string type(core::typeName(element.type));
@@ -112,7 +112,7 @@ Waiting::const_iterator nextClass(const Waiting& waiting) {
         if (refersToDone(waiting, *each->second)) return each;
         if (best == waiting.end()) best = each;
     }
-    // None fits only where a server sends classes that are their own superclasses: an end all the same.
+    // None fits where a server sends classes that are their own superclasses; the loop must end even then.
     return best == waiting.end() ? waiting.begin() : best;
 }
 

@@ -24,7 +24,7 @@ struct Context {
     Following following;
 };
 
-/// What the command line says beside the verb; each verb looks at what it has options for.
+/// The options and arguments of all verbs; each verb looks at its own.
 struct VerbOptions {
     ImageOptions image;              ///< install, check
     std::string job;                 ///< delete: its id, the number at the end of that, or its path
