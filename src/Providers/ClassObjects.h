@@ -1,5 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// How class objects come by their instances: once, anew at each enumeration, or only when something changed.
+// How class objects come by their instances: once, anew at each enumeration, or only when something changed;
+// and how instances come by those of other classes.
 #pragma once
 
 #include <memory>
@@ -7,10 +8,40 @@
 #include <utility>
 #include <vector>
 
-#include "Framework/Classes/CimClass.h"
+#include "Framework/Classes/CimBroker.h"
+#include "Framework/Model/CimInstance.h"
 #include "Utils/Debug.h"
 #include "Utils/Log.h"
 #include "Utils/Os/Linux/Mutex.h"
+
+/// Makes properties null, as a refresh does with what is not known.
+template <class... Property>
+void setNull(Property&... properties) {
+    (properties.setNull(), ...);
+}
+
+/// The instances of a class as the broker finds them, those that are a T. Holds them while it lives.
+template <class T>
+class InstancesOf {
+  public:
+    /// @param provider  whose instances; empty for those of everybody who serves the class
+    explicit InstancesOf(const std::string& className, const std::string& provider = {})
+        : m_all(core::GetCimBroker()->getInstances(className, provider)) {
+        for (core::CimInstance* each : m_all)
+            if (auto* found = dynamic_cast<T*>(each)) m_found.push_back(found);
+    }
+
+    /// How many instances the class has, including those that are not a T.
+    int count() { return static_cast<int>(m_all.size()); }
+    /// The first of them; null when there is none.
+    T* first() const { return m_found.empty() ? nullptr : m_found.front(); }
+    auto begin() const { return m_found.begin(); }
+    auto end() const { return m_found.end(); }
+
+  private:
+    core::InstanceRange m_all;
+    std::vector<T*> m_found;
+};
 
 /// A class object that serves instances of T from a list of its own.
 template <class T>
@@ -34,7 +65,7 @@ class SingletonClass : public ListedClass<T> {
     SingletonClass(const char* label, const char* file, int line)
         : m_label(label), m_file(file), m_line(line) {}
 
-    utils::SafeList<core::CimInstance*>::Iterator getInstances() override {
+    core::InstanceList::Iterator getInstances() override {
         log("getInstance");
         const utils::TimeStamp timing(m_label);
         createOnce();
@@ -83,9 +114,11 @@ class Rebuild {
         m_rebuilt.add(instance);
         return *instance;
     }
-    void publish() {
+    /// Returns the list as it is then.
+    core::InstanceList::Iterator publish() {
         m_instances.publish(m_rebuilt);
         m_isPublished = true;
+        return m_instances.getElements(false);
     }
 
   private:

@@ -4,7 +4,7 @@
 #include "Framework/Classes/CimBroker.h"
 #include "Framework/Classes/RequestScope.h"
 #include "Framework/Model/CimInstance.h"
-#include "Providers/Schema/UpdateInterfaces.h"
+#include "Providers/Schema/ProviderInterfaces.h"
 #include "Providers/Schema/ValueMaps.h"
 
 namespace cli {

@@ -49,10 +49,10 @@ struct CimElementText {
 struct CimClassInfo {
     const char* name;
     const CimClassInfo* superclass;
-    bool isAssociation;
-    std::span<const CimMethodInfo> methods;
+    bool isAssociation = false;
+    std::span<const CimMethodInfo> methods = {};
     /// Builds a bare instance; null for a class that adds no properties to its superclass.
-    std::unique_ptr<CimInstance> (*makeSample)();
+    std::unique_ptr<CimInstance> (*makeSample)() = nullptr;
     std::span<const CimElementText> texts = {};
     /// Classes that a parameter names and nobody serves. Clients look up their declarations all the same.
     std::span<const CimClassInfo* const> mentioned = {};

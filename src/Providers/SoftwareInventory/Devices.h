@@ -15,6 +15,9 @@
 /// the members of that class.
 namespace inventory {
 
+/// The name under which this provider registers.
+inline constexpr const char* kProviderName = "Software Inventory";
+
 /// A port, by what identifies it.
 struct Port {
     std::string adapter;
@@ -75,8 +78,8 @@ void setDeviceState(Device& device, EnabledState state) {
     const bool isKnown = state != EnabledState::Unknown;
     device.EnabledState = static_cast<std::uint16_t>(state);
     device.RequestedState = 12;  // not applicable: nobody can enable or disable it here
-    device.OperationalStatus = std::vector<std::uint16_t>{static_cast<std::uint16_t>(isKnown ? 2 : 0)};  // OK
-    device.HealthState = isKnown ? 5 : 0;                                                                // OK
+    device.OperationalStatus = {static_cast<std::uint16_t>(isKnown ? 2 : 0)};  // OK
+    device.HealthState = isKnown ? 5 : 0;                                      // OK
 }
 
 }  // namespace inventory

@@ -127,6 +127,7 @@ FirmwareCatalog::Files FirmwareCatalog::scan() {
         for (const std::string& name : os::listDirectory(directory)) {
             const std::string path = directory + "/" + name;
             Stamp stamp;
+            // A directory that the configuration lists twice is served once.
             if (entries.contains(path) || !takeStamp(path, stamp)) continue;
             const auto old = m_known.find(path);
             const bool isKnown = old != m_known.end() && old->second.stamp == stamp;

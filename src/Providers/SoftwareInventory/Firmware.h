@@ -9,7 +9,7 @@
 #include <vector>
 
 #include "MidAPI/Image/OptionRom.h"
-#include "Providers/Schema/InventoryInterfaces.h"
+#include "Providers/Schema/ProviderInterfaces.h"
 #include "Providers/SoftwareInventory/Devices.h"
 #include "Utils/Os/Linux/Mutex.h"
 

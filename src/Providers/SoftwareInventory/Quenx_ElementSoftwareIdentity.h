@@ -7,15 +7,14 @@
 /// What is installed (Antecedent) on a port (Dependent).
 class Quenx_ElementSoftwareIdentity : public CIM_ElementSoftwareIdentity {
   public:
-    static const core::CimClassInfo classInfo;
+    static constexpr core::CimClassInfo classInfo{"Quenx_ElementSoftwareIdentity",
+                                                  &CIM_ElementSoftwareIdentity::classInfo, true};
 
-    Quenx_ElementSoftwareIdentity();
-    std::string getClassName() const override;
-    ~Quenx_ElementSoftwareIdentity() override;
+    std::string getClassName() const override { return classInfo.name; }
 };
 
 /// Serves an association for each installed component, rebuilt on every call.
 class Quenx_ElementSoftwareIdentityClass : public ListedClass<Quenx_ElementSoftwareIdentity> {
   public:
-    utils::SafeList<core::CimInstance*>::Iterator getInstances() override;
+    core::InstanceList::Iterator getInstances() override;
 };

@@ -3,8 +3,6 @@
 
 #include "MidAPI/ma.h"
 #include "Providers/SoftwareInventory/Devices.h"
-#include "Utils/Debug.h"
-#include "Utils/Log.h"
 #include "Utils/Utils.h"
 
 namespace {
@@ -16,24 +14,10 @@ std::string addressText(const std::array<std::uint8_t, 6>& mac) {
 
 }  // namespace
 
-constinit const core::CimClassInfo Quenx_EthernetPort::classInfo{
-    "Quenx_EthernetPort", &CIM_EthernetPort::classInfo, false, {}, nullptr};
-
 Quenx_EthernetPort::Quenx_EthernetPort(inventory::Port port) : m_port(std::move(port)) {
-    declareClass(classInfo);
     inventory::setDeviceKeys(*this, getUniqId());
     PortType = 0;        // unknown: not told by the adapter API
     LinkTechnology = 2;  // Ethernet
-}
-
-Quenx_EthernetPort::~Quenx_EthernetPort() = default;
-
-std::string Quenx_EthernetPort::getClassName() const {
-    return classInfo.name;
-}
-
-std::string Quenx_EthernetPort::getUniqId() const {
-    return m_port.adapter;
 }
 
 void Quenx_EthernetPort::refresh() {
@@ -51,10 +35,7 @@ void Quenx_EthernetPort::setLink(const std::optional<ma::AdapterInfo>& info) {
     using inventory::EnabledState;
     if (!info) {
         inventory::setDeviceState(*this, EnabledState::Unknown);
-        Description.setNull();
-        Speed.setNull();
-        PermanentAddress.setNull();
-        NetworkAddresses.setNull();
+        setNull(Description, Speed, PermanentAddress, NetworkAddresses);
         return;
     }
     inventory::setDeviceState(*this, info->linkUp ? EnabledState::Enabled : EnabledState::EnabledButOffline);
@@ -69,15 +50,7 @@ void Quenx_EthernetPort::setLink(const std::optional<ma::AdapterInfo>& info) {
     }
 }
 
-std::string Quenx_EthernetPort::getAdapterName() const {
-    return m_port.adapter;
-}
-
-utils::PCIAddr Quenx_EthernetPort::getPCIAddress() const {
-    return m_port.address;
-}
-
-utils::SafeList<core::CimInstance*>::Iterator Quenx_EthernetPortClass::getInstances() {
+core::InstanceList::Iterator Quenx_EthernetPortClass::getInstances() {
     QUENX_DEBUG("getInstances");
     const utils::TimeStamp time("Quenx_EthernetPortClass::getInstances");
     return serve(inventory::readPorts());

@@ -3,25 +3,24 @@
 
 #include "Providers/ClassObjects.h"
 #include "Providers/Schema/CIM_EthernetPort.h"
-#include "Providers/Schema/InventoryInterfaces.h"
+#include "Providers/Schema/ProviderInterfaces.h"
 #include "Providers/SoftwareInventory/Devices.h"
 
 /// One port (one PCI function) of an Ethernet adapter.
 class Quenx_EthernetPort : public CIM_EthernetPort, public inventory::EthernetPort {
   public:
-    static const core::CimClassInfo classInfo;
+    static constexpr core::CimClassInfo classInfo{"Quenx_EthernetPort", &CIM_EthernetPort::classInfo};
 
     explicit Quenx_EthernetPort(inventory::Port port);
-    std::string getClassName() const override;
-    ~Quenx_EthernetPort() override;
+    std::string getClassName() const override { return classInfo.name; }
 
     /// The adapter name.
-    virtual std::string getUniqId() const;
+    virtual std::string getUniqId() const { return m_port.adapter; }
     /// Asks the adapter, then sets every value that can change.
     virtual void refresh();
 
-    std::string getAdapterName() const override;
-    utils::PCIAddr getPCIAddress() const override;
+    std::string getAdapterName() const override { return m_port.adapter; }
+    utils::PCIAddr getPCIAddress() const override { return m_port.address; }
 
   private:
     void setLink(const std::optional<ma::AdapterInfo>& info);
@@ -32,5 +31,5 @@ class Quenx_EthernetPort : public CIM_EthernetPort, public inventory::EthernetPo
 /// Serves a port for each adapter name.
 class Quenx_EthernetPortClass : public CachedClass<Quenx_EthernetPort, inventory::Port> {
   public:
-    utils::SafeList<core::CimInstance*>::Iterator getInstances() override;
+    core::InstanceList::Iterator getInstances() override;
 };

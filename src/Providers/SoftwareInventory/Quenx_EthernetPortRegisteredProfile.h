@@ -8,13 +8,11 @@
 /// other providers serve too.
 class Quenx_EthernetPortRegisteredProfile : public CIM_RegisteredProfile {
   public:
-    static const core::CimClassInfo classInfo;
+    static constexpr core::CimClassInfo classInfo{"Quenx_RegisteredProfile",
+                                                  &CIM_RegisteredProfile::classInfo};
 
-    Quenx_EthernetPortRegisteredProfile();
-    std::string getClassName() const override;
-    ~Quenx_EthernetPortRegisteredProfile() override;
+    std::string getClassName() const override { return classInfo.name; }
 
-    virtual std::string getUniqId() const;
     virtual void refresh();
 };
 

@@ -6,8 +6,6 @@
 
 #include "MidAPI/ma.h"
 #include "Providers/SoftwareInventory/Devices.h"
-#include "Utils/Debug.h"
-#include "Utils/Log.h"
 #include "Utils/Utils.h"
 
 namespace inventory {
@@ -25,19 +23,9 @@ std::vector<Card> groupByCard(const std::vector<Port>& ports) {
 
 }  // namespace inventory
 
-constinit const core::CimClassInfo Quenx_PortController::classInfo{
-    "Quenx_PortController", &CIM_PortController::classInfo, false, {}, nullptr};
-
 Quenx_PortController::Quenx_PortController(inventory::Card card) : m_card(std::move(card)) {
-    declareClass(classInfo);
     inventory::setDeviceKeys(*this, getUniqId());
     ControllerType = 2;  // Ethernet
-}
-
-Quenx_PortController::~Quenx_PortController() = default;
-
-std::string Quenx_PortController::getClassName() const {
-    return classInfo.name;
 }
 
 std::string Quenx_PortController::getUniqId() const {
@@ -79,7 +67,7 @@ bool Quenx_PortController::holds(const utils::PCIAddr& address) const {
     return address.sameAdapter(m_card.ports.front().address);
 }
 
-utils::SafeList<core::CimInstance*>::Iterator Quenx_PortControllerClass::getInstances() {
+core::InstanceList::Iterator Quenx_PortControllerClass::getInstances() {
     QUENX_DEBUG("getInstances");
     const utils::TimeStamp time("Quenx_PortControllerClass::getInstances");
     return serve(inventory::groupByCard(inventory::readPorts()));

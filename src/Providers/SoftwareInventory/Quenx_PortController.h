@@ -3,7 +3,7 @@
 
 #include "Providers/ClassObjects.h"
 #include "Providers/Schema/CIM_PortController.h"
-#include "Providers/Schema/InventoryInterfaces.h"
+#include "Providers/Schema/ProviderInterfaces.h"
 #include "Providers/SoftwareInventory/Devices.h"
 
 namespace inventory {
@@ -23,11 +23,10 @@ std::vector<Card> groupByCard(const std::vector<Port>& ports);
 /// One card with the ports that are its PCI functions.
 class Quenx_PortController : public CIM_PortController, public inventory::PortController {
   public:
-    static const core::CimClassInfo classInfo;
+    static constexpr core::CimClassInfo classInfo{"Quenx_PortController", &CIM_PortController::classInfo};
 
     explicit Quenx_PortController(inventory::Card card);
-    std::string getClassName() const override;
-    ~Quenx_PortController() override;
+    std::string getClassName() const override { return classInfo.name; }
 
     /// Bus and device, as "3b:00".
     virtual std::string getUniqId() const;
@@ -44,5 +43,5 @@ class Quenx_PortController : public CIM_PortController, public inventory::PortCo
 /// Serves a controller for each card.
 class Quenx_PortControllerClass : public CachedClass<Quenx_PortController, inventory::Card> {
   public:
-    utils::SafeList<core::CimInstance*>::Iterator getInstances() override;
+    core::InstanceList::Iterator getInstances() override;
 };

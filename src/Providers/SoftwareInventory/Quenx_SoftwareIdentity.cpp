@@ -4,9 +4,6 @@
 #include <algorithm>
 #include <set>
 
-#include "Utils/Debug.h"
-#include "Utils/Log.h"
-
 namespace {
 
 /// Values of CIM_SoftwareIdentity.Classifications.
@@ -31,23 +28,9 @@ void setText(core::CimPropertyString& property, const std::string& text) {
 
 }  // namespace
 
-constinit const core::CimClassInfo Quenx_SoftwareIdentity::classInfo{
-    "Quenx_SoftwareIdentity", &CIM_SoftwareIdentity::classInfo, false, {}, nullptr};
-
 Quenx_SoftwareIdentity::Quenx_SoftwareIdentity(inventory::Firmware firmware)
     : m_firmware(std::move(firmware)) {
-    declareClass(classInfo);
     InstanceID = "Quenx:" + getUniqId();
-}
-
-Quenx_SoftwareIdentity::~Quenx_SoftwareIdentity() = default;
-
-std::string Quenx_SoftwareIdentity::getClassName() const {
-    return classInfo.name;
-}
-
-std::string Quenx_SoftwareIdentity::getUniqId() const {
-    return m_firmware.identifier;
 }
 
 void Quenx_SoftwareIdentity::refresh() {
@@ -65,7 +48,7 @@ void Quenx_SoftwareIdentity::setKind() {
     IsEntity = isInstalled;
     Description = isInstalled ? "Firmware of adapter " + m_firmware.adapter
                               : "Firmware image for PCI device " + m_firmware.ids;
-    OperationalStatus = std::vector<std::uint16_t>{2};  // OK
+    OperationalStatus = {2};  // OK
 }
 
 void Quenx_SoftwareIdentity::setVersions() {
@@ -92,14 +75,6 @@ void Quenx_SoftwareIdentity::setVersions() {
     }
 }
 
-std::string Quenx_SoftwareIdentity::getIdentifier() const {
-    return m_firmware.identifier;
-}
-
-int Quenx_SoftwareIdentity::getTypeCode() const {
-    return m_firmware.typeCode;
-}
-
 utils::StringArray Quenx_SoftwareIdentity::getTargetTypes() const {
     utils::StringArray types;
     for (const inventory::FirmwareComponent& part : m_firmware.components)
@@ -110,7 +85,7 @@ utils::StringArray Quenx_SoftwareIdentity::getTargetTypes() const {
 Quenx_SoftwareIdentityClass::Quenx_SoftwareIdentityClass(std::shared_ptr<inventory::FirmwareCatalog> catalog)
     : m_catalog(std::move(catalog)) {}
 
-utils::SafeList<core::CimInstance*>::Iterator Quenx_SoftwareIdentityClass::getInstances() {
+core::InstanceList::Iterator Quenx_SoftwareIdentityClass::getInstances() {
     QUENX_DEBUG("getInstances");
     const utils::TimeStamp time("Quenx_SoftwareIdentityClass::getInstances");
     std::vector<inventory::Firmware> all;

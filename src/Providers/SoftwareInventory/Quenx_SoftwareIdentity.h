@@ -3,7 +3,7 @@
 
 #include "Providers/ClassObjects.h"
 #include "Providers/Schema/CIM_SoftwareIdentity.h"
-#include "Providers/Schema/InventoryInterfaces.h"
+#include "Providers/Schema/ProviderInterfaces.h"
 #include "Providers/SoftwareInventory/Firmware.h"
 
 /// A firmware: one in a file that can be installed, or one component that an adapter carries.
@@ -12,17 +12,16 @@
 /// of them; VersionString, and IdentityInfoValue beside IdentityInfoType "Quenx:IMG_...", have all.
 class Quenx_SoftwareIdentity : public CIM_SoftwareIdentity, public inventory::SoftwareIdentity {
   public:
-    static const core::CimClassInfo classInfo;
+    static constexpr core::CimClassInfo classInfo{"Quenx_SoftwareIdentity", &CIM_SoftwareIdentity::classInfo};
 
     explicit Quenx_SoftwareIdentity(inventory::Firmware firmware);
-    std::string getClassName() const override;
-    ~Quenx_SoftwareIdentity() override;
+    std::string getClassName() const override { return classInfo.name; }
 
-    virtual std::string getUniqId() const;
+    virtual std::string getUniqId() const { return m_firmware.identifier; }
     virtual void refresh();
 
-    std::string getIdentifier() const override;
-    int getTypeCode() const override;
+    std::string getIdentifier() const override { return m_firmware.identifier; }
+    int getTypeCode() const override { return m_firmware.typeCode; }
     utils::StringArray getTargetTypes() const override;
 
     /// The adapter on which the firmware is installed; empty for a file.
@@ -39,7 +38,7 @@ class Quenx_SoftwareIdentity : public CIM_SoftwareIdentity, public inventory::So
 class Quenx_SoftwareIdentityClass : public CachedClass<Quenx_SoftwareIdentity, inventory::Firmware> {
   public:
     explicit Quenx_SoftwareIdentityClass(std::shared_ptr<inventory::FirmwareCatalog> catalog);
-    utils::SafeList<core::CimInstance*>::Iterator getInstances() override;
+    core::InstanceList::Iterator getInstances() override;
 
   private:
     const std::shared_ptr<inventory::FirmwareCatalog> m_catalog;

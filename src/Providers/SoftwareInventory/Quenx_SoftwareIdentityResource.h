@@ -3,25 +3,26 @@
 
 #include "Providers/ClassObjects.h"
 #include "Providers/Schema/CIM_SoftwareIdentityResource.h"
-#include "Providers/Schema/InventoryInterfaces.h"
+#include "Providers/Schema/ProviderInterfaces.h"
 #include "Providers/SoftwareInventory/Firmware.h"
 
 /// A firmware file in one of the configured directories.
 class Quenx_SoftwareIdentityResource : public CIM_SoftwareIdentityResource,
                                        public inventory::SoftwareIdentityResource {
   public:
-    static const core::CimClassInfo classInfo;
+    static constexpr core::CimClassInfo classInfo{"Quenx_SoftwareIdentityResource",
+                                                  &CIM_SoftwareIdentityResource::classInfo};
 
     explicit Quenx_SoftwareIdentityResource(inventory::FirmwareFile file);
-    std::string getClassName() const override;
-    ~Quenx_SoftwareIdentityResource() override;
+    std::string getClassName() const override { return classInfo.name; }
 
     /// The file's path.
-    virtual std::string getUniqId() const;
+    virtual std::string getUniqId() const { return m_file.path; }
     virtual void refresh();
 
-    std::string getFirmwareFileID() const override;
-    std::string getAccessInfo() const override;
+    std::string getFirmwareFileID() const override { return m_file.firmware.identifier; }
+    /// Never percent-encoded: nothing decodes it.
+    std::string getAccessInfo() const override { return "file://" + m_file.path; }
 
   private:
     const inventory::FirmwareFile m_file;
@@ -32,7 +33,7 @@ class Quenx_SoftwareIdentityResourceClass
     : public CachedClass<Quenx_SoftwareIdentityResource, inventory::FirmwareFile> {
   public:
     explicit Quenx_SoftwareIdentityResourceClass(std::shared_ptr<inventory::FirmwareCatalog> catalog);
-    utils::SafeList<core::CimInstance*>::Iterator getInstances() override;
+    core::InstanceList::Iterator getInstances() override;
 
   private:
     const std::shared_ptr<inventory::FirmwareCatalog> m_catalog;

@@ -5,22 +5,19 @@
 #include <unordered_map>
 #include <vector>
 
-#include "Framework/Classes/InstanceList.h"
-#include "Providers/Schema/CIM_ManagedElement.h"
-#include "Providers/Schema/InventoryInterfaces.h"
+#include "Providers/ClassObjects.h"
+#include "Providers/Schema/CIM_SoftwareInstallationService.h"
+#include "Providers/Schema/ProviderInterfaces.h"
 
 // What the associations join, found through the broker, whoever provides it.
 
-/// The InstanceIDs by which registered profiles are told apart. The second is registered by the provider that
-/// serves the ports.
-inline constexpr const char* kSoftwareUpdateProfile = "Quenx:SoftwareUpdate";
-inline constexpr const char* kEthernetPortProfile = "Quenx:EthernetPort";
-
-/// Enumerates the installation services.
-utils::SafeList<core::CimInstance*>::Iterator allServices();
-/// The one among them, which the range holds. Throws the assertion "(int)services.size() == 1" when there is
-/// not exactly one.
-const core::CimInstance* onlyService(core::InstanceRange& services);
+/// The installation services.
+struct Services : InstancesOf<const CIM_SoftwareInstallationService> {
+    Services() : InstancesOf("Quenx_SoftwareInstallationService") {}
+};
+/// The one among them, which they hold. Throws the assertion "(int)services.size() == 1" when there is not
+/// exactly one.
+const CIM_SoftwareInstallationService* onlyOne(Services& services);
 
 /// A port as the inventory serves it, with the controllers that hold its address.
 struct IndexedPort {
@@ -41,8 +38,8 @@ class AdapterIndex {
     const IndexedPort* findPort(const std::string& adapterName) const;
 
   private:
-    core::InstanceRange m_portInstances;
-    core::InstanceRange m_controllerInstances;
+    InstancesOf<const inventory::EthernetPort> m_portInstances{"Quenx_EthernetPort"};
+    InstancesOf<const inventory::PortController> m_controllerInstances{"Quenx_PortController"};
     std::vector<IndexedPort> m_ports;
     std::unordered_map<std::string, std::size_t> m_portsByName;
 };

@@ -19,12 +19,17 @@ namespace {
 
 using Buffer = std::unique_ptr<std::uint8_t[]>;
 
+// The functions that the log names, whichever helper here writes the line: those who search it know the
+// operations of the job.
+constexpr const char* kGetTargetTypes = "getTargetTypes";
+constexpr const char* kCheckAndVerifyImage = "checkAndVerifyImage";
+
 /// The index of the name in the table of target types; logs the comparison.
 std::optional<utils::FirmwareType> findTargetType(const std::string& name) {
     constexpr auto& names = Quenx_SoftwareInstallationServiceCapabilities::TargetTypesDescription;
     for (std::size_t index = 0; index < names.size(); ++index) {
-        QUENX_DEBUG("index: %d", static_cast<int>(index));
-        QUENX_DEBUG("compare with %s", names[index]);
+        utils::formatDebugLog(__FILE__, kGetTargetTypes, __LINE__, "index: %d", static_cast<int>(index));
+        utils::formatDebugLog(__FILE__, kGetTargetTypes, __LINE__, "compare with %s", names[index]);
         if (name == names[index]) return static_cast<utils::FirmwareType>(index);
     }
     return std::nullopt;
@@ -34,19 +39,19 @@ std::optional<utils::FirmwareType> findTargetType(const std::string& name) {
 void appendTargetTypes(const std::string& value, std::vector<utils::FirmwareType>& types) {
     for (const std::string& piece : utils::split(value, InstallOption::kTargetTypeSeparator)) {
         const std::string name = utils::trim(piece);
-        QUENX_DEBUG("TeargetType: %s", name.c_str());
+        utils::formatDebugLog(__FILE__, kGetTargetTypes, __LINE__, "TeargetType: %s", name.c_str());
         const auto type = findTargetType(name);
         if (!type) {
             throw utils::EInvalidParameter(utils::formatStr(
                 "Invalid parameter detected for TargetTypes. %s is not recognized", name.c_str()));
         }
         types.push_back(*type);
-        QUENX_DEBUG("added new image type - #%d", static_cast<int>(*type));
+        utils::formatDebugLog(__FILE__, kGetTargetTypes, __LINE__, "added new image type - #%d",
+                              static_cast<int>(*type));
     }
 }
 
-/// What Quenx_ConcreteJob::getTargetTypes() returns, without a word about the claim. Named like it, since the
-/// log names the function.
+/// What Quenx_ConcreteJob::getTargetTypes() returns, without a word about the claim.
 std::vector<utils::FirmwareType> getTargetTypes(const std::vector<std::uint16_t>& options,
                                                 const std::vector<std::string>& values) {
     std::vector<utils::FirmwareType> types;
@@ -100,7 +105,8 @@ Buffer readImage(const std::string& uri, const std::string& path, std::uint32_t 
 /// An image with other types than the adapter has needs force, and a configuration that permits downgrades.
 void judgeOtherTypes(bool force, const std::string& uri) {
     const bool enabled = utils::AutoSingleton<utils::SMASHv2Config>::getInstance()->isDowngradeEnabled();
-    QUENX_DEBUG("DowngradeEnable: %d, ForceInstall: %d", enabled, force);
+    utils::formatDebugLog(__FILE__, kCheckAndVerifyImage, __LINE__, "DowngradeEnable: %d, ForceInstall: %d",
+                          enabled, force);
     if (!enabled) {
         throw EDowngradeDetected(
             "The selected flash image cannot be used because it does not contain the same "
@@ -137,38 +143,35 @@ void judge(int status, bool force, const std::string& uri, const std::string& ad
 
 }  // namespace
 
-PreparedImage examineImage(const std::string& adapterName, const std::string& uri,
-                           const std::vector<std::uint16_t>& installOptions,
-                           const std::vector<std::string>& installOptionValues) {
-    QUENX_DEBUG("Checking URI : '%s' ", uri.c_str());
+PreparedImage examineImage(const UpdateOrder& order) {
+    const auto& [adapterName, uri, options, values] = order;
+    utils::formatDebugLog(__FILE__, kCheckAndVerifyImage, __LINE__, "Checking URI : '%s' ", uri.c_str());
     const std::string path = locate(uri);
     // Measured once: buffers, reading and preparation must agree on one size, whatever happens to the file.
     // The adapter API counts in 32 bits.
     const auto fileSize = static_cast<std::uint32_t>(os::getFileSize(path));
     const Buffer source = readImage(uri, path, fileSize);
     PreparedImage image{std::make_unique_for_overwrite<std::uint8_t[]>(fileSize), fileSize,
-                        getTargetTypes(installOptions, installOptionValues)};
+                        getTargetTypes(options, values)};
 
-    QUENX_DEBUG("Start preparing the image");
+    utils::formatDebugLog(__FILE__, kCheckAndVerifyImage, __LINE__, "Start preparing the image");
     const int status = ma::prepareFlashImage(adapterName, source.get(), fileSize, image.bytes.get(),
                                              &image.size, image.types);
-    QUENX_DEBUG("Image prepared %d", status);
+    utils::formatDebugLog(__FILE__, kCheckAndVerifyImage, __LINE__, "Image prepared %d", status);
     const bool force =
-        Quenx_SoftwareInstallationService::IsValueDefined(InstallOption::ForceInstallation, installOptions);
+        Quenx_SoftwareInstallationService::IsValueDefined(InstallOption::ForceInstallation, options);
     judge(status, force, uri, adapterName);
     return image;
 }
 
-VerifiedImage verifyImage(const std::string& adapterName, const std::string& uri,
-                          const std::vector<std::uint16_t>& installOptions,
-                          const std::vector<std::string>& installOptionValues) {
-    QUENX_DEBUG("Here");
+VerifiedImage verifyImage(const UpdateOrder& order) {
+    utils::formatDebugLog(__FILE__, kCheckAndVerifyImage, __LINE__, "Here");
     AdapterClaim claim(Quenx_ConcreteJob::m_servicedAdapter);
     // Before the first look at the image: preparing it may take seconds, and the verdict holds only while
     // nobody else writes to the adapter.
-    claim.take(adapterName);
+    claim.take(order.adapterName);
     try {
-        PreparedImage image = examineImage(adapterName, uri, installOptions, installOptionValues);
+        PreparedImage image = examineImage(order);
         return {std::move(claim), std::move(image)};
     } catch (const utils::Exception& exception) {
         // A refusal says that nothing was done to the adapter, so others may have it.
@@ -199,7 +202,7 @@ void Quenx_ConcreteJob::checkAndVerifyImage(std::string adapterName, std::string
                                             std::unique_ptr<std::uint8_t[]>& image, std::uint32_t& imageSize,
                                             std::vector<utils::FirmwareType>& imageTypes) {
     // The claim object goes and the adapter stays claimed: the caller answers for it.
-    PreparedImage prepared = verifyImage(adapterName, uri, installOptions, installOptionValues).image;
+    PreparedImage prepared = verifyImage({adapterName, uri, installOptions, installOptionValues}).image;
     image = std::move(prepared.bytes);
     imageSize = prepared.size;
     imageTypes = std::move(prepared.types);

@@ -9,6 +9,14 @@
 #include "Providers/SoftwareUpdate/AdapterClaim.h"
 #include "Utils/FirmwareTypes.h"
 
+/// What the job registry is asked to install or to check.
+struct UpdateOrder {
+    std::string adapterName;
+    std::string uri;
+    std::vector<std::uint16_t> options;
+    std::vector<std::string> values;  ///< beside the options
+};
+
 /// An image as the adapter API has prepared it for an adapter.
 struct PreparedImage {
     std::unique_ptr<std::uint8_t[]> bytes;
@@ -23,13 +31,9 @@ struct VerifiedImage {
 };
 
 /// Reads the image that the URI names, has the adapter API prepare it and judges the answer. Claims nothing.
-/// Throws the refusals of MethodResults.h.
-PreparedImage examineImage(const std::string& adapterName, const std::string& uri,
-                           const std::vector<std::uint16_t>& installOptions,
-                           const std::vector<std::string>& installOptionValues);
+/// Throws the refusals of MethodResults.h, and what the adapter API throws.
+PreparedImage examineImage(const UpdateOrder& order);
 
 /// The same with the adapter claimed. A refusal gives the claim back before it leaves; any other failure
 /// keeps it, since the adapter is then in an unknown state, unless the configuration asks for its release.
-VerifiedImage verifyImage(const std::string& adapterName, const std::string& uri,
-                          const std::vector<std::uint16_t>& installOptions,
-                          const std::vector<std::string>& installOptionValues);
+VerifiedImage verifyImage(const UpdateOrder& order);

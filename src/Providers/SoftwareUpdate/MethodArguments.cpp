@@ -1,13 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Providers/SoftwareUpdate/MethodArguments.h"
 
-#include "Framework/Classes/CimBroker.h"
-#include "Framework/Classes/InstanceList.h"
-#include "Framework/Model/CimInstance.h"
 #include "Framework/Model/CimProperties.h"
 #include "Framework/Model/CimPropertyRef.h"
-#include "Providers/Schema/InventoryInterfaces.h"
-#include "Utils/Log.h"
+#include "Providers/ClassObjects.h"
+#include "Providers/Schema/ProviderInterfaces.h"
 #include "Utils/Utils.h"
 
 namespace {
@@ -28,12 +25,14 @@ core::CimInstance* findInstance(core::CimPath path) noexcept {
     }
 }
 
-/// The class's instances, of any provider; none when the look-up throws.
-core::InstanceRange findInstances(const char* className) {
+/// The class's instances, of any provider; none when the look-up throws. The request's scope holds them.
+template <class T>
+std::vector<const T*> findInstances(const char* className) {
     try {
-        return core::InstanceRange(core::GetCimBroker()->getInstances(className, ""));
+        const InstancesOf<const T> found(className);
+        return {found.begin(), found.end()};
     } catch (...) {
-        return core::InstanceRange(core::InstanceList().getElements(false));
+        return {};
     }
 }
 
@@ -42,10 +41,8 @@ std::string firstPortOf(const core::CimInstance& controllerInstance) {
     const auto* controller = dynamic_cast<const inventory::PortController*>(&controllerInstance);
     // Somebody else may serve the class without the interface.
     if (controller == nullptr) return {};
-    for (const core::CimInstance* each : findInstances("Quenx_EthernetPort")) {
-        const auto* port = dynamic_cast<const inventory::EthernetPort*>(each);
-        if (port != nullptr && controller->holds(port->getPCIAddress())) return port->getAdapterName();
-    }
+    for (const auto* port : findInstances<inventory::EthernetPort>("Quenx_EthernetPort"))
+        if (controller->holds(port->getPCIAddress())) return port->getAdapterName();
     return {};
 }
 
@@ -54,11 +51,9 @@ std::string firstPortOf(const core::CimInstance& controllerInstance) {
 std::string findUri(const std::string& identifier) {
     std::string uri;
     try {
-        for (const core::CimInstance* each : findInstances("Quenx_SoftwareIdentityResource")) {
-            const auto* resource = dynamic_cast<const inventory::SoftwareIdentityResource*>(each);
-            if (resource != nullptr && resource->getFirmwareFileID() == identifier)
-                uri = resource->getAccessInfo();
-        }
+        const char* className = "Quenx_SoftwareIdentityResource";
+        for (const auto* resource : findInstances<inventory::SoftwareIdentityResource>(className))
+            if (resource->getFirmwareFileID() == identifier) uri = resource->getAccessInfo();
     } catch (...) {
         // To a client, a resource that cannot say where its file is has no file.
         return {};
@@ -76,24 +71,73 @@ std::string join(const utils::StringArray& names) {
 }
 
 /// The identity, if it is one of a firmware image; null, with a line in the log, if not.
-const inventory::SoftwareIdentity* imageIdentity(const MethodTraits& method, const core::CimPath& source) {
+const inventory::SoftwareIdentity* imageIdentity(const MethodKind& kind, const core::CimPath& source) {
     const core::CimInstance* instance = findInstance(source);
+    const std::string path = source.toString();
     if (instance == nullptr) {
-        QUENX_DEBUG("%s cannot find instance '%s'", method.subject, source.toString().c_str());
+        QUENX_DEBUG("%s cannot find instance '%s'", kind.subject, path.c_str());
         return nullptr;
     }
     const auto* identity = dynamic_cast<const inventory::SoftwareIdentity*>(instance);
     // A class that derives from the identity, or only borrows its name, may mean something else by it.
     if (instance->getClassName() != "Quenx_SoftwareIdentity" || identity == nullptr) {
-        QUENX_DEBUG("%s does not support source '%s'", method.subject, source.toString().c_str());
+        QUENX_DEBUG("%s does not support source '%s'", kind.subject, path.c_str());
         return nullptr;
     }
     if (identity->getTypeCode() != inventory::SoftwareIdentity::FirmwareImage) {
-        QUENX_DEBUG("%s does not support source '%s'. It is not a proper Firmware Image.", method.subject,
-                    source.toString().c_str());
+        QUENX_DEBUG("%s does not support source '%s'. It is not a proper Firmware Image.", kind.subject,
+                    path.c_str());
         return nullptr;
     }
     return identity;
+}
+
+/// These two complete the order; they return what the method returns at once, if anything.
+std::optional<unsigned int> resolveSource(const MethodKind& kind, const core::CimPath& source,
+                                          UpdateOrder& order) {
+    const inventory::SoftwareIdentity* identity = imageIdentity(kind, source);
+    if (identity == nullptr) return MethodReturn::InvalidParameter;
+    const std::string identifier = identity->getIdentifier();
+    order.uri = findUri(identifier);
+    if (order.uri.empty()) {
+        QUENX_DEBUG("Could not obtain URI from the SoftwareIdentityResource (%s)", identifier.c_str());
+        return MethodReturn::InvalidParameter;
+    }
+    QUENX_DEBUG("URI is: %s", order.uri.c_str());
+    const std::string targetTypes = join(identity->getTargetTypes());
+    if (targetTypes.empty()) {
+        QUENX_DEBUG("Source '%s' does not contain any TargetTypes", source.toString().c_str());
+        return MethodReturn::InvalidParameter;
+    }
+    QUENX_DEBUG("TargetTypes are: %s", targetTypes.c_str());
+    order.options.insert(order.options.begin(), InstallOption::TargetTypes);
+    order.values.insert(order.values.begin(), targetTypes);
+    return std::nullopt;
+}
+
+std::optional<unsigned int> resolveTarget(const MethodKind& kind, const core::CimPath& target,
+                                          UpdateOrder& order) {
+    const core::CimInstance* instance = findInstance(target);
+    const std::string path = target.toString();
+    if (instance == nullptr) {
+        QUENX_DEBUG("%s cannot find instance '%s'", kind.subject, path.c_str());
+        return MethodReturn::InvalidParameter;
+    }
+    const std::string className = instance->getClassName();
+    if (className == "Quenx_PortController") {
+        order.adapterName = firstPortOf(*instance);
+    } else if (className == "Quenx_EthernetPort") {
+        const auto* port = dynamic_cast<const inventory::EthernetPort*>(instance);
+        if (port != nullptr) order.adapterName = port->getAdapterName();
+    } else {
+        QUENX_DEBUG("Firmware Update does not support target '%s'", path.c_str());
+        return MethodReturn::NotApplicable;
+    }
+    if (order.adapterName.empty()) {
+        QUENX_DEBUG("Firmware Update does not support instance '%s'", path.c_str());
+        return MethodReturn::InvalidParameter;
+    }
+    return std::nullopt;
 }
 
 }  // namespace
@@ -135,45 +179,15 @@ void MethodArguments::setCodes(const char* name, std::vector<std::uint16_t> code
     require<core::CimPropertyUint16_arr>(m_arguments, name) = std::move(codes);
 }
 
-ResolvedTarget resolveTarget(const MethodTraits& method, const core::CimPath& target) {
-    const core::CimInstance* instance = findInstance(target);
-    if (instance == nullptr) {
-        QUENX_DEBUG("%s cannot find instance '%s'", method.subject, target.toString().c_str());
-        return {MethodReturn::InvalidParameter, {}};
+std::optional<unsigned int> resolve(const MethodKind& kind, const core::CimPath* source,
+                                    const core::CimPath& target, UpdateOrder& order) {
+    try {
+        if (source != nullptr)
+            if (const auto refused = resolveSource(kind, *source, order)) return refused;
+        return resolveTarget(kind, target, order);
+    } catch (...) {
+        // The failures of other providers never leave a method.
+        QUENX_DEBUG("Unspecified Error for '%s'", target.toString().c_str());
+        return MethodReturn::UnspecifiedError;
     }
-    std::string adapterName;
-    const std::string className = instance->getClassName();
-    if (className == "Quenx_PortController") {
-        adapterName = firstPortOf(*instance);
-    } else if (className == "Quenx_EthernetPort") {
-        const auto* port = dynamic_cast<const inventory::EthernetPort*>(instance);
-        if (port != nullptr) adapterName = port->getAdapterName();
-    } else {
-        QUENX_DEBUG("Firmware Update does not support target '%s'", target.toString().c_str());
-        return {MethodReturn::NotApplicable, {}};
-    }
-    if (adapterName.empty()) {
-        QUENX_DEBUG("Firmware Update does not support instance '%s'", target.toString().c_str());
-        return {MethodReturn::InvalidParameter, {}};
-    }
-    return {0, std::move(adapterName)};
-}
-
-ResolvedSource resolveSource(const MethodTraits& method, const core::CimPath& source) {
-    const inventory::SoftwareIdentity* identity = imageIdentity(method, source);
-    if (identity == nullptr) return {MethodReturn::InvalidParameter, {}, {}};
-    const std::string identifier = identity->getIdentifier();
-    std::string uri = findUri(identifier);
-    if (uri.empty()) {
-        QUENX_DEBUG("Could not obtain URI from the SoftwareIdentityResource (%s)", identifier.c_str());
-        return {MethodReturn::InvalidParameter, {}, {}};
-    }
-    QUENX_DEBUG("URI is: %s", uri.c_str());
-    std::string targetTypes = join(identity->getTargetTypes());
-    if (targetTypes.empty()) {
-        QUENX_DEBUG("Source '%s' does not contain any TargetTypes", source.toString().c_str());
-        return {MethodReturn::InvalidParameter, {}, {}};
-    }
-    QUENX_DEBUG("TargetTypes are: %s", targetTypes.c_str());
-    return {0, std::move(uri), std::move(targetTypes)};
 }

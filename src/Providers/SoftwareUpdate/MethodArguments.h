@@ -3,11 +3,13 @@
 
 #include <cstdint>
 #include <initializer_list>
+#include <optional>
 #include <string>
 #include <vector>
 
 #include "Framework/Model/CimPropertyList.h"
 #include "Framework/Model/CimValue.h"
+#include "Providers/SoftwareUpdate/ImageVerification.h"
 #include "Providers/SoftwareUpdate/MethodResults.h"
 
 /// The arguments of a method call. Every operation throws utils::EUnspecifiedError for an argument that was
@@ -33,22 +35,10 @@ class MethodArguments {
     const core::CimPropertyList& m_arguments;
 };
 
-/// What a method's Target stands for.
-struct ResolvedTarget {
-    unsigned int returnValue;  ///< 0, or what the method returns at once
-    std::string adapterName;
-};
-
-/// A port stands for itself, a controller for its first port. What cannot be looked up is not found. Failures
-/// are logged. Throws what an instance of the inventory throws.
-ResolvedTarget resolveTarget(const MethodTraits& method, const core::CimPath& target);
-
-/// What a method's Source stands for.
-struct ResolvedSource {
-    unsigned int returnValue;  ///< 0, or what the method returns at once
-    std::string uri;
-    std::string targetTypes;  ///< joined by plus signs
-};
-
-/// The image of a software identity, found through the resource that has its file; else as resolveTarget().
-ResolvedSource resolveSource(const MethodTraits& method, const core::CimPath& source);
+/// Completes the order from the Target: a port stands for itself, a controller for its first port. With a
+/// Source, a software identity, the image is that of the resource that has its file. What cannot be looked up
+/// is not found, and what an instance of another provider throws is answered, not passed on.
+/// @param source  null for a method without one
+/// @return what the method returns at once, with a line in the log; nothing when the order is complete
+std::optional<unsigned int> resolve(const MethodKind& kind, const core::CimPath* source,
+                                    const core::CimPath& target, UpdateOrder& order);

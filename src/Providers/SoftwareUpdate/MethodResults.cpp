@@ -1,36 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Providers/SoftwareUpdate/MethodResults.h"
 
-#include <algorithm>
-#include <iterator>
-
 #include "Utils/Log.h"
-
-const MethodTraits kCheckSoftwareIdentity{"Quenx_SoftwareInstallationService::CheckSoftwareIdentity",
-                                          "Verification of image",
-                                          "Image verification",
-                                          "Checking Firmware Update",
-                                          "Both Target and Collection are defined",
-                                          false};
-const MethodTraits kInstallFromUri{"Quenx_SoftwareInstallationService::InstallFromURI",
-                                   "Creation of new job",
-                                   "Job creation",
-                                   "Firmware Update",
-                                   nullptr,
-                                   true};
-const MethodTraits kInstallFromSoftwareIdentity{
-    "Quenx_SoftwareInstallationService::InstallFromSoftwareIdentity",
-    "Creation of new job",
-    "Job creation",
-    "Firmware Update",
-    "Target and Collection are defined",
-    true};
-const MethodTraits kCheckImage{"Quenx_SoftwareInstallationService::checkImage",
-                               "Verification of image",
-                               "Image verification",
-                               "Checking Firmware Update",
-                               nullptr,
-                               false};
 
 namespace {
 
@@ -57,10 +28,11 @@ constexpr Handler kHandlers[] = {
     {is<ENotApplicableForTarget>, VerifyJobResult::NotApplicableForTarget},
 };
 
-const Handler* handlerOf(const utils::Exception& exception) {
-    const auto* const handler = std::find_if(std::begin(kHandlers), std::end(kHandlers),
-                                             [&](const Handler& each) { return each.handles(exception); });
-    return handler == std::end(kHandlers) ? nullptr : handler;
+/// Success for an exception that is not a refusal.
+int codeOf(const utils::Exception& exception) {
+    for (const Handler& handler : kHandlers)
+        if (handler.handles(exception)) return handler.code;
+    return VerifyJobResult::Success;
 }
 
 /// A line of the log is `before`, the target's path, `after`.
@@ -91,27 +63,27 @@ constexpr Verdict kVerdicts[] = {
 }  // namespace
 
 bool isRefusal(const utils::Exception& exception) {
-    return handlerOf(exception) != nullptr;
+    return codeOf(exception) != VerifyJobResult::Success;
 }
 
 int verifyJobResultOfCurrentException() noexcept {
     try {
         throw;
     } catch (const utils::Exception& exception) {
-        const Handler* const handler = handlerOf(exception);
-        if (handler == nullptr) return VerifyJobResult::UnspecifiedError;
+        const int code = codeOf(exception);
+        if (code == VerifyJobResult::Success) return VerifyJobResult::UnspecifiedError;
         QUENX_ERROR("Exception: '%s'", exception.what());
-        return handler->code;
+        return code;
     } catch (...) {
         // What is not a refusal has logged itself, if it could.
         return VerifyJobResult::UnspecifiedError;
     }
 }
 
-unsigned int returnValueOf(const MethodTraits& method, int verifyJobResult, const std::string& target) {
-    QUENX_DEBUG("%s returns: %d", method.verification, verifyJobResult);
+unsigned int returnValueOf(const MethodKind& kind, int verifyJobResult, const std::string& target) {
+    QUENX_DEBUG("%s returns: %d", kind.verification, verifyJobResult);
     if (verifyJobResult == VerifyJobResult::InvalidParameter) {
-        QUENX_DEBUG("%s returned Invalid Parameter for '%s'", method.parameterVerdict, target.c_str());
+        QUENX_DEBUG("%s returned Invalid Parameter for '%s'", kind.parameterVerdict, target.c_str());
         return MethodReturn::InvalidParameter;
     }
     for (const Verdict& verdict : kVerdicts) {
@@ -120,5 +92,5 @@ unsigned int returnValueOf(const MethodTraits& method, int verifyJobResult, cons
         return verdict.returnValue;
     }
     // Nothing above matched, so it is a success: registries may have numbers that are not known here.
-    return method.createsJob ? MethodReturn::JobStarted : MethodReturn::Completed;
+    return kind.createsJob ? MethodReturn::JobStarted : MethodReturn::Completed;
 }

@@ -93,20 +93,17 @@ bool isRefusal(const utils::Exception& exception);
 /// Call it within a catch block only. Never throws.
 int verifyJobResultOfCurrentException() noexcept;
 
-/// What tells the three methods and the check in process apart.
-struct MethodTraits {
-    const char* name;              ///< labels the call in the log
+/// What tells the methods that only verify from those that install.
+struct MethodKind {
     const char* verification;      ///< "... returns: %d"
     const char* parameterVerdict;  ///< "... returned Invalid Parameter for '%s'"
     const char* subject;           ///< who cannot find an instance or does not support a source
-    const char* bothGiven;         ///< the error for a Target and a Collection; null for no Collection at all
     bool createsJob;
 };
 
-extern const MethodTraits kCheckSoftwareIdentity;
-extern const MethodTraits kInstallFromUri;
-extern const MethodTraits kInstallFromSoftwareIdentity;
-extern const MethodTraits kCheckImage;
+inline constexpr MethodKind kChecking{"Verification of image", "Image verification",
+                                      "Checking Firmware Update", false};
+inline constexpr MethodKind kInstalling{"Creation of new job", "Job creation", "Firmware Update", true};
 
 /// Logs the registry's result and what it means for the target; returns the method's return value.
-unsigned int returnValueOf(const MethodTraits& method, int verifyJobResult, const std::string& target);
+unsigned int returnValueOf(const MethodKind& kind, int verifyJobResult, const std::string& target);

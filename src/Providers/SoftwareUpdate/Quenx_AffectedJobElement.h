@@ -7,14 +7,14 @@
 /// A job updates a port, and so the card that carries it.
 class Quenx_AffectedJobElement : public CIM_AffectedJobElement {
   public:
-    static const core::CimClassInfo classInfo;
+    static constexpr core::CimClassInfo classInfo{"Quenx_AffectedJobElement",
+                                                  &CIM_AffectedJobElement::classInfo, true};
 
-    std::string getClassName() const override;
-    ~Quenx_AffectedJobElement() override;
+    std::string getClassName() const override { return classInfo.name; }
 };
 
 /// Rebuilt on every enumeration.
 class Quenx_AffectedJobElementClass : public ListedClass<Quenx_AffectedJobElement> {
   public:
-    utils::SafeList<core::CimInstance*>::Iterator getInstances() override;
+    core::InstanceList::Iterator getInstances() override;
 };

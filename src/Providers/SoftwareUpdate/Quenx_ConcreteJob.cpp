@@ -4,10 +4,10 @@
 #include <optional>
 
 #include "MidAPI/ma.h"
+#include "Providers/ClassObjects.h"
 #include "Providers/SoftwareUpdate/ImageVerification.h"
 #include "Providers/SoftwareUpdate/JobThread.h"
 #include "Utils/Exception.h"
-#include "Utils/Log.h"
 #include "Utils/Utils.h"
 
 namespace {
@@ -47,9 +47,6 @@ std::optional<bool> isFinished(JobStateVal state) {
 
 }  // namespace
 
-constinit const core::CimClassInfo Quenx_ConcreteJob::classInfo{
-    "Quenx_ConcreteJob", &CIM_ConcreteJob::classInfo, false, {}, nullptr};
-
 // Built before, and so destroyed after, the agent at file scope: its destruction waits for workers that end
 // their jobs.
 __attribute__((init_priority(1000))) utils::Atomic<std::string> Quenx_ConcreteJob::m_servicedAdapter;
@@ -60,7 +57,7 @@ Quenx_ConcreteJob::Quenx_ConcreteJob(std::string adapterName, int jobId, std::st
     : m_adapterName(std::move(adapterName)), m_jobId(jobId) {
     // For its worker, and so for a flash: no request may be the one that waits.
     setDestructionWaits();
-    VerifiedImage verified = verifyImage(m_adapterName, uri, installOptions, installOptionValues);
+    VerifiedImage verified = verifyImage({m_adapterName, uri, installOptions, installOptionValues});
     m_claim = std::move(verified.claim);
     m_flashImage = std::move(verified.image.bytes);
     m_flashImageSize = verified.image.size;
@@ -82,10 +79,6 @@ Quenx_ConcreteJob::~Quenx_ConcreteJob() {
         const utils::Mutex::AutoLocker lock(m_jobMutex);
         worker = std::move(m_myThread);
     }
-}
-
-std::string Quenx_ConcreteJob::getClassName() const {
-    return classInfo.name;
 }
 
 std::string Quenx_ConcreteJob::getUniqId() const {
@@ -205,9 +198,11 @@ void Quenx_ConcreteJob::refresh() {
     const core::RecursiveLocker properties(getMutex());
     Caption = fmt("Firmware Update Job %d", m_jobId);
     Description = Caption;
-    setUnknownProperties();
-    OperationalStatus.clear();
-    OperationalStatus.push_back(kOperationalStatusOk);
+    setNull(ElementName, Generation, InstallDate, StatusDescriptions, Status, HealthState, PrimaryStatus,
+            DetailedStatus, OperatingStatus, CommunicationStatus, JobStatus, TimeSubmitted,
+            ScheduledStartTime, RunMonth, RunDay, RunDayOfWeek, RunStartInterval, LocalOrUtcTime, UntilTime,
+            Notify, Owner, RecoveryAction, OtherRecoveryAction);
+    OperationalStatus = {kOperationalStatusOk};
     StartTime = m_startTime;
     JobRunTimes = 1;
     Priority = 0;
@@ -224,15 +219,4 @@ void Quenx_ConcreteJob::refresh() {
     ErrorDescription = m_lastErrorText;
     JobState = static_cast<std::uint16_t>(m_jobState);
     TimeOfLastStateChange = m_timeOfLastStateChange;
-}
-
-void Quenx_ConcreteJob::setUnknownProperties() {
-    for (core::CimProperty* property : std::initializer_list<core::CimProperty*>{
-             &ElementName,  &Generation,       &InstallDate,        &StatusDescriptions, &Status,
-             &HealthState,  &PrimaryStatus,    &DetailedStatus,     &OperatingStatus,    &CommunicationStatus,
-             &JobStatus,    &TimeSubmitted,    &ScheduledStartTime, &RunMonth,           &RunDay,
-             &RunDayOfWeek, &RunStartInterval, &LocalOrUtcTime,     &UntilTime,          &Notify,
-             &Owner,        &RecoveryAction,   &OtherRecoveryAction}) {
-        property->setNull();
-    }
 }

@@ -28,7 +28,7 @@ enum ThreadOperationCommand : int {
 /// One firmware update of one adapter, from the verified image to its end. Thread-safe.
 class Quenx_ConcreteJob : public CIM_ConcreteJob {
   public:
-    static const core::CimClassInfo classInfo;
+    static constexpr core::CimClassInfo classInfo{"Quenx_ConcreteJob", &CIM_ConcreteJob::classInfo};
 
     /// The adapter that is being serviced; empty when none is. AdapterClaim alone writes it.
     static utils::Atomic<std::string> m_servicedAdapter;
@@ -39,7 +39,7 @@ class Quenx_ConcreteJob : public CIM_ConcreteJob {
                       std::vector<std::uint16_t>& installOptions,
                       std::vector<std::string>& installOptionValues);
 
-    std::string getClassName() const override;
+    std::string getClassName() const override { return classInfo.name; }
     /// Waits for a worker that has been started, and so for a flash that has begun.
     ~Quenx_ConcreteJob() override;
 
@@ -83,7 +83,6 @@ class Quenx_ConcreteJob : public CIM_ConcreteJob {
                                     std::vector<utils::FirmwareType>& imageTypes);
 
   private:
-    void setUnknownProperties();
     /// True for the one caller who may start the job.
     bool claimStart();
 

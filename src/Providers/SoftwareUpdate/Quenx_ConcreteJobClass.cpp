@@ -1,13 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Providers/SoftwareUpdate/Quenx_ConcreteJobClass.h"
 
-#include "Framework/Classes/CimBroker.h"
-#include "Framework/Classes/InstanceList.h"
 #include "Framework/Classes/RequestScope.h"
-#include "Providers/SoftwareUpdate/ImageVerification.h"
 #include "Providers/SoftwareUpdate/MethodResults.h"
-#include "Utils/Debug.h"
-#include "Utils/Log.h"
 
 namespace {
 
@@ -16,8 +11,6 @@ constexpr std::uint32_t kStartTimeout = 100;  // seconds
 }  // namespace
 
 Quenx_ConcreteJobClass::Quenx_ConcreteJobClass() : m_factory(this) {}
-
-Quenx_ConcreteJobClass::~Quenx_ConcreteJobClass() = default;
 
 utils::SafeList<core::CimInstance*>::Iterator Quenx_ConcreteJobClass::getInstances() {
     const utils::TimeStamp timing("ConcreteJob::getInstances");
@@ -46,22 +39,20 @@ int Quenx_ConcreteJobClass::verifyOrCreateNewJob(std::string adapterName, std::s
     const core::RequestScope scope;  // a client may delete the job as soon as it is listed
     job = nullptr;
     try {
-        if (create) return createJob(adapterName, uri, installOptions, installOptionValues, job);
-        verifyImage(adapterName, uri, installOptions, installOptionValues).claim.releaseIfConfigured();
+        UpdateOrder order{std::move(adapterName), std::move(uri), installOptions, installOptionValues};
+        if (create) return createJob(order, job);
+        verifyImage(order).claim.releaseIfConfigured();
         return VerifyJobResult::Success;
     } catch (...) {
         return verifyJobResultOfCurrentException();
     }
 }
 
-int Quenx_ConcreteJobClass::createJob(const std::string& adapterName, std::string& uri,
-                                      std::vector<std::uint16_t>& installOptions,
-                                      std::vector<std::string>& installOptionValues,
-                                      Quenx_ConcreteJob*& job) {
+int Quenx_ConcreteJobClass::createJob(UpdateOrder& order, Quenx_ConcreteJob*& job) {
     // Taken even if no job comes of it, so ids can have gaps.
     const std::int32_t id = m_nextJobId++;
-    QUENX_DEBUG("Creating new job for %s with id #%d", adapterName.c_str(), id);
-    auto* created = new Quenx_ConcreteJob(adapterName, id, uri, installOptions, installOptionValues);
+    QUENX_DEBUG("Creating new job for %s with id #%d", order.adapterName.c_str(), id);
+    auto* created = new Quenx_ConcreteJob(order.adapterName, id, order.uri, order.options, order.values);
     bool listed = false;
     try {
         // Listed before it starts: whoever hears of its end must find it.
@@ -77,7 +68,7 @@ int Quenx_ConcreteJobClass::createJob(const std::string& adapterName, std::strin
     } catch (...) {
         if (listed) m_instances.remove(created);
         // Where listing it failed, the job has gone already, and only the name is left.
-        AdapterClaim::releaseIfConfigured(Quenx_ConcreteJob::m_servicedAdapter, adapterName);
+        AdapterClaim::releaseIfConfigured(Quenx_ConcreteJob::m_servicedAdapter, order.adapterName);
         throw;
     }
     // Its destruction waits for a thread that never ran, so it is left to the list's release.
@@ -88,11 +79,10 @@ int Quenx_ConcreteJobClass::createJob(const std::string& adapterName, std::strin
 int Quenx_ConcreteJobClass::DeleteInstance(core::CimPath& path) {
     QUENX_DEBUG("DeleteInstance");
     const core::RequestScope scope;  // another request may delete the same job meanwhile
-    core::CimBroker* broker = core::GetCimBroker();
     QUENX_DEBUG("All jobs: %d", static_cast<int>(m_instances.size()));
     Quenx_ConcreteJob* job = nullptr;
     try {
-        job = dynamic_cast<Quenx_ConcreteJob*>(broker->getInstanceByPath(path));
+        job = dynamic_cast<Quenx_ConcreteJob*>(core::GetCimBroker()->getInstanceByPath(path));
     } catch (...) {
         // The same as a path that names nothing.
     }

@@ -6,6 +6,7 @@
 #include <vector>
 
 #include "Providers/ClassObjects.h"
+#include "Providers/SoftwareUpdate/ImageVerification.h"
 #include "Providers/SoftwareUpdate/Quenx_ConcreteJob.h"
 #include "Utils/Singleton.h"
 
@@ -32,7 +33,6 @@ class Quenx_ConcreteJobClass : public ListedClass<Quenx_ConcreteJob> {
 
     /// Refreshes every job, and disposes of workers that have finished.
     utils::SafeList<core::CimInstance*>::Iterator getInstances() override;
-    ~Quenx_ConcreteJobClass() override;
 
     /// Verifies an image for an adapter, and with `create` makes a job of it and starts it. Never throws for
     /// a refusal: returns a VerifyJobResult code.
@@ -52,9 +52,7 @@ class Quenx_ConcreteJobClass : public ListedClass<Quenx_ConcreteJob> {
     void addJob(Quenx_ConcreteJob* job) { m_instances.add(job); }
 
   private:
-    int createJob(const std::string& adapterName, std::string& uri,
-                  std::vector<std::uint16_t>& installOptions, std::vector<std::string>& installOptionValues,
-                  Quenx_ConcreteJob*& job);
+    int createJob(UpdateOrder& order, Quenx_ConcreteJob*& job);
 
     std::atomic<std::int32_t> m_nextJobId{1};
     ConcreteJobFactory m_factory;

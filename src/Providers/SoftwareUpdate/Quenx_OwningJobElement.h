@@ -7,14 +7,14 @@
 /// The service owns a job.
 class Quenx_OwningJobElement : public CIM_OwningJobElement {
   public:
-    static const core::CimClassInfo classInfo;
+    static constexpr core::CimClassInfo classInfo{"Quenx_OwningJobElement", &CIM_OwningJobElement::classInfo,
+                                                  true};
 
-    std::string getClassName() const override;
-    ~Quenx_OwningJobElement() override;
+    std::string getClassName() const override { return classInfo.name; }
 };
 
 /// Rebuilt on every enumeration. Throws the assertion unless there is one service.
 class Quenx_OwningJobElementClass : public ListedClass<Quenx_OwningJobElement> {
   public:
-    utils::SafeList<core::CimInstance*>::Iterator getInstances() override;
+    core::InstanceList::Iterator getInstances() override;
 };

@@ -3,13 +3,9 @@
 
 #include <algorithm>
 
-#include "Framework/Classes/CimBroker.h"
 #include "MidAPI/ma.h"
-#include "Providers/Schema/CIM_Service.h"
 #include "Providers/SoftwareUpdate/AssociationEnds.h"
 #include "Providers/SoftwareUpdate/Quenx_SoftwareInstallationServiceCapabilities.h"
-#include "Utils/Debug.h"
-#include "Utils/Log.h"
 
 namespace {
 
@@ -17,9 +13,8 @@ void associate(const CIM_Service* service, const CIM_ManagedElement* affected, R
     auto& association = rebuilt.add<Quenx_ServiceAffectsElement>();
     association.AffectedElement = affected;
     association.AffectingElement = service;
-    association.ElementEffects.setNull();
-    association.OtherElementEffectsDescriptions.setNull();
-    association.AssignedSequence.setNull();
+    setNull(association.ElementEffects, association.OtherElementEffectsDescriptions,
+            association.AssignedSequence);
 }
 
 bool isSupportedType(const std::string& type) {
@@ -48,29 +43,18 @@ void associateAdapters(const CIM_Service* service, const AdapterIndex& adapters,
 
 }  // namespace
 
-constinit const core::CimClassInfo Quenx_ServiceAffectsElement::classInfo{
-    "Quenx_ServiceAffectsElement", &CIM_ServiceAffectsElement::classInfo, true, {}, nullptr};
-
-Quenx_ServiceAffectsElement::~Quenx_ServiceAffectsElement() = default;
-
-std::string Quenx_ServiceAffectsElement::getClassName() const {
-    return classInfo.name;
-}
-
-utils::SafeList<core::CimInstance*>::Iterator Quenx_ServiceAffectsElementClass::getInstances() {
+core::InstanceList::Iterator Quenx_ServiceAffectsElementClass::getInstances() {
     QUENX_DEBUG("getInstances");
     const utils::TimeStamp timing("Quenx_ServiceAffectsElementClass::getInstances");
     Rebuild rebuilt(m_instances);
-    core::InstanceRange services(allServices());
+    Services services;
     const AdapterIndex adapters;
-    core::InstanceRange identities(core::GetCimBroker()->getInstances("Quenx_SoftwareIdentity", ""));
-    const auto* service = dynamic_cast<const CIM_Service*>(onlyService(services));
+    const InstancesOf<const inventory::SoftwareIdentity> identities("Quenx_SoftwareIdentity");
+    const CIM_SoftwareInstallationService* service = onlyOne(services);
     associateAdapters(service, adapters, rebuilt);
-    for (const core::CimInstance* each : identities) {
-        const auto* identity = dynamic_cast<const inventory::SoftwareIdentity*>(each);
-        if (identity == nullptr || !isInstallable(*identity)) continue;
-        associate(service, dynamic_cast<const CIM_ManagedElement*>(each), rebuilt);
+    for (const inventory::SoftwareIdentity* identity : identities) {
+        if (!isInstallable(*identity)) continue;
+        associate(service, dynamic_cast<const CIM_ManagedElement*>(identity), rebuilt);
     }
-    rebuilt.publish();
-    return m_instances.getElements(false);
+    return rebuilt.publish();
 }

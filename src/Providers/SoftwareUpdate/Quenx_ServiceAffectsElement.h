@@ -7,15 +7,15 @@
 /// The service can update a port, its card, or a firmware image can be installed by it.
 class Quenx_ServiceAffectsElement : public CIM_ServiceAffectsElement {
   public:
-    static const core::CimClassInfo classInfo;
+    static constexpr core::CimClassInfo classInfo{"Quenx_ServiceAffectsElement",
+                                                  &CIM_ServiceAffectsElement::classInfo, true};
 
-    std::string getClassName() const override;
-    ~Quenx_ServiceAffectsElement() override;
+    std::string getClassName() const override { return classInfo.name; }
 };
 
 /// Rebuilt on every enumeration. Throws the assertion unless there is one service. A card with several ports
 /// that can be updated has one association for each.
 class Quenx_ServiceAffectsElementClass : public ListedClass<Quenx_ServiceAffectsElement> {
   public:
-    utils::SafeList<core::CimInstance*>::Iterator getInstances() override;
+    core::InstanceList::Iterator getInstances() override;
 };

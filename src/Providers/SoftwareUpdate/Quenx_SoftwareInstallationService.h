@@ -6,18 +6,18 @@
 
 #include "Providers/ClassObjects.h"
 #include "Providers/Schema/CIM_SoftwareInstallationService.h"
-#include "Providers/Schema/UpdateInterfaces.h"
+#include "Providers/Schema/ProviderInterfaces.h"
 
 /// The one software installation service (DSP1025), with its extrinsic methods. The methods return the values
 /// of the DMTF value map; only argument errors, a missing job registry and failed assertions leave them as
 /// exceptions.
 class Quenx_SoftwareInstallationService : public CIM_SoftwareInstallationService, public update::ImageCheck {
   public:
-    static const core::CimClassInfo classInfo;
+    static constexpr core::CimClassInfo classInfo{"Quenx_SoftwareInstallationService",
+                                                  &CIM_SoftwareInstallationService::classInfo};
 
     Quenx_SoftwareInstallationService();
-    std::string getClassName() const override;
-    ~Quenx_SoftwareInstallationService() override;
+    std::string getClassName() const override { return classInfo.name; }
 
     virtual void refresh();
     /// Verifies the image at a URI and starts a job that installs it. 4096 and the job on success.

@@ -16,19 +16,6 @@ constexpr std::uint16_t kFileScheme = 3;
 
 }  // namespace
 
-constinit const core::CimClassInfo Quenx_SoftwareInstallationServiceCapabilities::classInfo{
-    "Quenx_SoftwareInstallationServiceCapabilities",
-    &CIM_SoftwareInstallationServiceCapabilities::classInfo,
-    false,
-    {},
-    nullptr};
-
-Quenx_SoftwareInstallationServiceCapabilities::~Quenx_SoftwareInstallationServiceCapabilities() = default;
-
-std::string Quenx_SoftwareInstallationServiceCapabilities::getClassName() const {
-    return classInfo.name;
-}
-
 std::string Quenx_SoftwareInstallationServiceCapabilities::getUniqId() {
     return fmt("Capabilities@%s", Quenx_SoftwareInstallationService::getUniqId().c_str());
 }
@@ -38,7 +25,6 @@ void Quenx_SoftwareInstallationServiceCapabilities::refresh() {
     Caption = "Capabilities for Ethernet Firmware Update";
     Description = "Capabilities for Firmware Update Service for Tarvel(R) Ethernet Adapters";
     ElementName = Caption;
-    Generation.setNull();
     InstanceID = fmt("Quenx:%s", getUniqId().c_str());
 
     SupportedAsynchronousActions = {kInstallFromUri, kInstallFromSoftwareIdentity};
@@ -51,11 +37,9 @@ void Quenx_SoftwareInstallationServiceCapabilities::refresh() {
     CanAddToCollection = false;
     SupportedInstallOptions = {InstallOption::ForceInstallation, InstallOption::Update,
                                InstallOption::TargetTypes};
-    OtherSupportedExtendedResourceTypeDescriptions.setNull();
-    SupportedExtendedResourceTypesMajorVersions.setNull();
-    SupportedExtendedResourceTypesMinorVersions.setNull();
-    SupportedExtendedResourceTypesRevisionNumbers.setNull();
-    SupportedExtendedResourceTypesBuildNumbers.setNull();
+    setNull(Generation, OtherSupportedExtendedResourceTypeDescriptions,
+            SupportedExtendedResourceTypesMajorVersions, SupportedExtendedResourceTypesMinorVersions,
+            SupportedExtendedResourceTypesRevisionNumbers, SupportedExtendedResourceTypesBuildNumbers);
     SupportedURISchemes = {kFileScheme};
 }
 

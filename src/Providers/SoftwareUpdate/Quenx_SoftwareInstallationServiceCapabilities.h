@@ -10,14 +10,14 @@
 /// What the software installation service can do (DSP1025).
 class Quenx_SoftwareInstallationServiceCapabilities : public CIM_SoftwareInstallationServiceCapabilities {
   public:
-    static const core::CimClassInfo classInfo;
+    static constexpr core::CimClassInfo classInfo{"Quenx_SoftwareInstallationServiceCapabilities",
+                                                  &CIM_SoftwareInstallationServiceCapabilities::classInfo};
 
     /// The names of the target types; the index is the utils::FirmwareType. Entry 0 is never published.
     static constexpr std::array<const char*, 6> TargetTypesDescription = {"",        "IMG_CLP",  "IMG_iSCSI",
                                                                           "IMG_PXE", "IMG_UEFI", "IMG_FCoE"};
 
-    std::string getClassName() const override;
-    ~Quenx_SoftwareInstallationServiceCapabilities() override;
+    std::string getClassName() const override { return classInfo.name; }
 
     virtual std::string getUniqId();
     virtual void refresh();

@@ -7,10 +7,10 @@
 /// The service has its capabilities.
 class Quenx_SoftwareUpdateElementCapabilities : public CIM_ElementCapabilities {
   public:
-    static const core::CimClassInfo classInfo;
+    static constexpr core::CimClassInfo classInfo{"Quenx_ElementCapabilities",
+                                                  &CIM_ElementCapabilities::classInfo, true};
 
-    std::string getClassName() const override;
-    ~Quenx_SoftwareUpdateElementCapabilities() override;
+    std::string getClassName() const override { return classInfo.name; }
 };
 
 /// Built at the first enumeration and kept. Throws the assertion unless there is one service and one
@@ -18,7 +18,7 @@ class Quenx_SoftwareUpdateElementCapabilities : public CIM_ElementCapabilities {
 class Quenx_SoftwareUpdateElementCapabilitiesClass
     : public ListedClass<Quenx_SoftwareUpdateElementCapabilities> {
   public:
-    utils::SafeList<core::CimInstance*>::Iterator getInstances() override;
+    core::InstanceList::Iterator getInstances() override;
 
   private:
     utils::Mutex m_creation;

@@ -7,15 +7,15 @@
 /// The service conforms to the Software Update profile.
 class Quenx_SoftwareUpdateElementConformsToProfile : public CIM_ElementConformsToProfile {
   public:
-    static const core::CimClassInfo classInfo;
+    static constexpr core::CimClassInfo classInfo{"Quenx_ElementConformsToProfile",
+                                                  &CIM_ElementConformsToProfile::classInfo, true};
 
-    std::string getClassName() const override;
-    ~Quenx_SoftwareUpdateElementConformsToProfile() override;
+    std::string getClassName() const override { return classInfo.name; }
 };
 
 /// Rebuilt on every enumeration.
 class Quenx_SoftwareUpdateElementConformsToProfileClass
     : public ListedClass<Quenx_SoftwareUpdateElementConformsToProfile> {
   public:
-    utils::SafeList<core::CimInstance*>::Iterator getInstances() override;
+    core::InstanceList::Iterator getInstances() override;
 };

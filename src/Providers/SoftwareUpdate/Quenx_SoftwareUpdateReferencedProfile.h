@@ -7,14 +7,14 @@
 /// The Ethernet port profile refers to the Software Update profile.
 class Quenx_SoftwareUpdateReferencedProfile : public CIM_ReferencedProfile {
   public:
-    static const core::CimClassInfo classInfo;
+    static constexpr core::CimClassInfo classInfo{"Quenx_ReferencedProfile",
+                                                  &CIM_ReferencedProfile::classInfo, true};
 
-    std::string getClassName() const override;
-    ~Quenx_SoftwareUpdateReferencedProfile() override;
+    std::string getClassName() const override { return classInfo.name; }
 };
 
 /// Rebuilt on every enumeration; empty where one of the two profiles is not registered.
 class Quenx_SoftwareUpdateReferencedProfileClass : public ListedClass<Quenx_SoftwareUpdateReferencedProfile> {
   public:
-    utils::SafeList<core::CimInstance*>::Iterator getInstances() override;
+    core::InstanceList::Iterator getInstances() override;
 };

@@ -1,39 +1,11 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Providers/SoftwareUpdate/Quenx_SoftwareUpdateRegisteredProfile.h"
 
-#include "Providers/SoftwareUpdate/AssociationEnds.h"
-
-namespace {
-
-// Values of the DMTF value maps of CIM_RegisteredProfile.
-constexpr std::uint16_t kSpecificationType = 2;
-constexpr std::uint16_t kOrganizationDmtf = 2;
-constexpr std::uint16_t kAdvertiseOther = 1;
-
-}  // namespace
-
-constinit const core::CimClassInfo Quenx_SoftwareUpdateRegisteredProfile::classInfo{
-    "Quenx_RegisteredProfile", &CIM_RegisteredProfile::classInfo, false, {}, nullptr};
-
-Quenx_SoftwareUpdateRegisteredProfile::~Quenx_SoftwareUpdateRegisteredProfile() = default;
-
-std::string Quenx_SoftwareUpdateRegisteredProfile::getClassName() const {
-    return classInfo.name;
-}
+#include "Providers/RegisteredProfile.h"
 
 void Quenx_SoftwareUpdateRegisteredProfile::refresh() {
-    const core::RecursiveLocker lock(getMutex());
-    InstanceID = kSoftwareUpdateProfile;
-    SpecificationType = kSpecificationType;
-    RegisteredOrganization = kOrganizationDmtf;
-    OtherRegisteredOrganization.setNull();
-    RegisteredName = "Software Update";
-    RegisteredVersion = "1.0.0";
-    AdvertiseTypes = {kAdvertiseOther};
-    AdvertiseTypeDescriptions = std::vector<std::string>{"WS-Identify"};
-    Caption = RegisteredName;
-    Description = "Software Update Profile for Tarvel(R) Ethernet Adapters";
-    ElementName.setNull();
+    registerProfile(*this, kSoftwareUpdateProfile, "Software Update", "1.0.0",
+                    "Software Update Profile for Tarvel(R) Ethernet Adapters");
 }
 
 Quenx_SoftwareUpdateRegisteredProfileClass::Quenx_SoftwareUpdateRegisteredProfileClass()

@@ -8,10 +8,10 @@
 class Quenx_SoftwareUpdateRegisteredProfile : public CIM_RegisteredProfile {
   public:
     /// Named "Quenx_RegisteredProfile": every provider serves its profile under this class.
-    static const core::CimClassInfo classInfo;
+    static constexpr core::CimClassInfo classInfo{"Quenx_RegisteredProfile",
+                                                  &CIM_RegisteredProfile::classInfo};
 
-    std::string getClassName() const override;
-    ~Quenx_SoftwareUpdateRegisteredProfile() override;
+    std::string getClassName() const override { return classInfo.name; }
 
     virtual void refresh();
 };

@@ -7,7 +7,7 @@
 #include "Framework/Classes/CimBroker.h"
 #include "Framework/Classes/RequestScope.h"
 #include "MidAPI/Image/RomFormat.h"
-#include "Providers/Schema/UpdateInterfaces.h"
+#include "Providers/Schema/ProviderInterfaces.h"
 #include "Providers/SoftwareUpdate/UpdateTest.h"
 #include "Support/TestRoms.h"
 

@@ -9,7 +9,7 @@
 #include "Providers/Schema/CIM_PortController.h"
 #include "Providers/Schema/CIM_SoftwareIdentity.h"
 #include "Providers/Schema/CIM_SoftwareIdentityResource.h"
-#include "Providers/Schema/InventoryInterfaces.h"
+#include "Providers/Schema/ProviderInterfaces.h"
 #include "Providers/SoftwareUpdate/UpdateTest.h"
 
 namespace {

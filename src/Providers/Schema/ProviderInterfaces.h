@@ -1,15 +1,22 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include <cstdint>
 #include <string>
+#include <vector>
 
 #include "Utils/Export.h"
 #include "Utils/FirmwareTypes.h"
 #include "Utils/StringArray.h"
 
-/// What the inventory's instances can do for other providers. A provider finds an instance through the broker
-/// and asks it by dynamic_cast from core::CimInstance; no provider library links another. All operations may
-/// be called from any thread, while the instance is held.
+namespace core {
+class CimPath;
+}
+
+// What instances can do for other providers and for a front in the same process, beside what clients see. Who
+// needs them finds an instance through the broker and asks it by dynamic_cast from core::CimInstance; no
+// provider library links another. All operations may be called from any thread, while the instance is held.
+
 namespace inventory {
 
 /// One port of an Ethernet adapter.
@@ -59,3 +66,19 @@ class QUENX_EXPORT SoftwareIdentityResource {
 };
 
 }  // namespace inventory
+
+namespace update {
+
+/// Judges images without installing them.
+class QUENX_EXPORT ImageCheck {
+  public:
+    virtual ~ImageCheck();
+    /// Verifies the image at a URI as InstallFromURI does with these arguments, and ends there: no job is
+    /// created and no adapter is claimed, now or afterwards, so that an update may run meanwhile. Returns 0
+    /// for an image that could be installed, else what InstallFromURI returns. Thread-safe.
+    virtual unsigned int checkImage(const std::string& uri, const core::CimPath& target,
+                                    const std::vector<std::uint16_t>& options,
+                                    const std::vector<std::string>& values) = 0;
+};
+
+}  // namespace update
