@@ -120,17 +120,12 @@ TEST_F(ChangingFileTest, OddPathsAreRefusedOrReadLikeAnyOther) {
     for (const std::string& uri : {
              std::string("file:///proc/self/maps"),  // says that it is empty
              std::string("file:///proc/kcore"),
-             std::string("file:///proc/self/mem"),
-             std::string("file:///dev/null"),
              std::string("file:///dev/zero"),
-             std::string("file:///dev/tty"),
              "file://" + huge,
              "file://" + larger,
              "file://" + (m_folder / "fifo"),
              "file:///" + std::string(5000, 'x'),
-             "file:///" + std::string(2500, '/') + std::string(2500, '.'),
              good + std::string("\0.bak", 5),
-             std::string("file://\0", 8),
              std::string("file://"),
              "file://\n" + good.substr(7),
          }) {

@@ -47,9 +47,7 @@ class FaultTableTest : public test::UpdateTest {
 
     std::string components() const { return test::describeRom(m_adapters->flashContent("eth4")); }
     CallResult installOnEth4(const std::string& uri) const {
-        return call("InstallFromURI", {test::textArgument("URI", uri), test::pathArgument("Target", m_port),
-                                       test::codesArgument("InstallOptions", {32768, 5}),
-                                       test::textsArgument("InstallOptionsValues", {"IMG_UEFI"})});
+        return install(uri, m_port, {32768, 5}, {"IMG_UEFI"});
     }
 
     const core::CimPath m_port = port("eth4");
@@ -181,7 +179,7 @@ TEST_F(FaultTableTest, EveryFaultEndsAsDocumentedAndTheNextUpdateWorks) {
 
 TEST_F(FaultTableTest, WithoutAnyThreadNobodyWaits) {
     if (testing::UnitTest::GetInstance()->test_to_run_count() > 1)
-        GTEST_SKIP() << "another test may have left the thread that buries jobs";
+        GTEST_SKIP() << "another test may have left the thread that frees jobs";
     test::refusesThreads = true;
     EXPECT_EQ(install(goodImage(), "eth0").returnValue, kFailed);
     EXPECT_TRUE(m_requests.enumerateInstanceNames("Quenx_ConcreteJob").empty());

@@ -1,6 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include <dlfcn.h>
+#include <gtest/gtest.h>
+
 #include <string>
 
 namespace test {
@@ -9,15 +12,30 @@ namespace test {
 /// it mapped, with its agent alive, so that a leak report has a file and a line.
 class ProviderLibrary {
   public:
-    explicit ProviderLibrary(const std::string& path);
+    explicit ProviderLibrary(const std::string& path)
+        : m_handle(dlopen(path.c_str(), RTLD_NOW | RTLD_LOCAL | (isUnloadable() ? 0 : RTLD_NODELETE))) {
+        EXPECT_NE(m_handle, nullptr) << dlerror();
+    }
     ProviderLibrary(const ProviderLibrary&) = delete;
     ProviderLibrary& operator=(const ProviderLibrary&) = delete;
-    ~ProviderLibrary();
+    ~ProviderLibrary() {
+        EXPECT_TRUE(m_handle == nullptr || dlclose(m_handle) == 0);
+    }
 
     /// Whether unloading really takes a library out of this process.
-    static bool isUnloadable();
+    static bool isUnloadable() {
+#ifdef QUENX_SANITIZED
+        return false;
+#else
+        return true;
+#endif
+    }
     /// Whether a library of that path is mapped now.
-    static bool isMapped(const std::string& path);
+    static bool isMapped(const std::string& path) {
+        void* const handle = dlopen(path.c_str(), RTLD_NOW | RTLD_NOLOAD);
+        if (handle != nullptr) dlclose(handle);
+        return handle != nullptr;
+    }
 
   private:
     void* m_handle;

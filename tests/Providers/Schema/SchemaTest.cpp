@@ -139,7 +139,7 @@ TEST(SchemaTest, DeclaresTheMethodsOfTheService) {
 }
 
 /// A text for an element that the class does not declare would reach no client.
-TEST(Schema, DescribesOnlyWhatItsClassesDeclare) {
+TEST(SchemaTest, DescribesOnlyWhatItsClassesDeclare) {
     const test::ProviderLibrary inventory(QUENX_INVENTORY_LIBRARY);
     const test::ProviderLibrary update(QUENX_UPDATE_LIBRARY);
     for (const auto& [name, info] : allClasses()) {

@@ -35,43 +35,49 @@ class ModelTest : public test::UpdateTest {
     }
 };
 
-TEST_F(ModelTest, TheServiceIsServedOnceWithItsValues) {
-    const auto services = m_requests.enumerateInstances("Quenx_SoftwareInstallationService");
-    ASSERT_EQ(services.size(), 1U);
-    EXPECT_EQ(valuesOf(services[0]),
-              (Texts{"SystemCreationClassName!=Quenx_SoftwareInstallationService",
-                     "SystemName!=" + os::getHostname(),
-                     "CreationClassName!=Quenx_SoftwareInstallationService", "Name!=Quenx:FirmwareUpdate",
-                     "PrimaryOwnerName=Tarvel Corporation", "PrimaryOwnerContact=https://www.tarvel.example",
-                     "OperationalStatus=2", "Caption=Ethernet Firmware Update",
-                     "Description=Firmware Update Service for Tarvel(R) Ethernet Adapters"}));
-    EXPECT_EQ(services[0].properties.size(), 29U);
-
-    test::SyslogCapture::clear();
-    core::CimBroker& broker = *core::GetCimBroker();
-    EXPECT_EQ(broker.getInstances("Quenx_SoftwareInstallationService", "").first(),
-              broker.getInstances("Quenx_SoftwareInstallationService", "Software Update").first());
-    EXPECT_TRUE(logged("getInstance"));
-    EXPECT_TRUE(logged("return 1"));
-    EXPECT_FALSE(logged("create new instance"));
-    EXPECT_TRUE(test::SyslogCapture::contains("time(SoftwareInstallationService::getInstances) = "));
-}
-
-TEST_F(ModelTest, TheCapabilitiesAreServedOnceWithTheirValues) {
-    const auto capabilities = m_requests.enumerateInstances("Quenx_SoftwareInstallationServiceCapabilities");
-    ASSERT_EQ(capabilities.size(), 1U);
-    EXPECT_EQ(
-        valuesOf(capabilities[0]),
-        (Texts{"SupportedAsynchronousActions=5, 3", "SupportedSynchronousActions=2",
+TEST_F(ModelTest, ServiceAndCapabilitiesAreServedOnceWithTheirValues) {
+    struct Row {
+        const char* className;
+        std::size_t propertyCount;
+        Texts values;
+    };
+    for (const Row& row : std::vector<Row>{
+             {"Quenx_SoftwareInstallationService",
+              29,
+              {"SystemCreationClassName!=Quenx_SoftwareInstallationService",
+               "SystemName!=" + os::getHostname(), "CreationClassName!=Quenx_SoftwareInstallationService",
+               "Name!=Quenx:FirmwareUpdate", "PrimaryOwnerName=Tarvel Corporation",
+               "PrimaryOwnerContact=https://www.tarvel.example", "OperationalStatus=2",
+               "Caption=Ethernet Firmware Update",
+               "Description=Firmware Update Service for Tarvel(R) Ethernet Adapters"}},
+             {"Quenx_SoftwareInstallationServiceCapabilities",
+              17,
+              {"SupportedAsynchronousActions=5, 3", "SupportedSynchronousActions=2",
                "SupportedTargetTypes=IMG_CLP, IMG_iSCSI, IMG_PXE, IMG_UEFI, IMG_FCoE",
                "SupportedExtendedResourceTypes=2", "CanAddToCollection=FALSE",
                "SupportedInstallOptions=3, 5, 32768", "SupportedURISchemes=3",
                "InstanceID!=Quenx:Capabilities@FirmwareUpdate",
                "ElementName=Capabilities for Ethernet Firmware Update",
                "Caption=Capabilities for Ethernet Firmware Update",
-               "Description=Capabilities for Firmware Update Service for Tarvel(R) Ethernet Adapters"}));
-    EXPECT_EQ(capabilities[0].properties.size(), 17U);
-    EXPECT_TRUE(test::SyslogCapture::contains("create new instance"));
+               "Description=Capabilities for Firmware Update Service for Tarvel(R) Ethernet Adapters"}},
+         }) {
+        test::SyslogCapture::clear();
+        const auto instances = m_requests.enumerateInstances(row.className);
+        ASSERT_EQ(instances.size(), 1U);
+        EXPECT_EQ(valuesOf(instances[0]), row.values);
+        EXPECT_EQ(instances[0].properties.size(), row.propertyCount);
+        EXPECT_TRUE(test::SyslogCapture::contains("\"create new instance\" (getInstances@" +
+                                                  std::string(row.className) + ".cpp:"));
+
+        test::SyslogCapture::clear();
+        core::CimBroker& broker = *core::GetCimBroker();
+        EXPECT_EQ(broker.getInstances(row.className, "").first(),
+                  broker.getInstances(row.className, "Software Update").first());
+        EXPECT_TRUE(logged("getInstance"));
+        EXPECT_TRUE(logged("return 1"));
+        EXPECT_FALSE(logged("create new instance"));
+        EXPECT_TRUE(test::SyslogCapture::contains("time(SoftwareInstallationService::getInstances) = "));
+    }
 }
 
 TEST_F(ModelTest, ClassesAreServedInTheirOrder) {

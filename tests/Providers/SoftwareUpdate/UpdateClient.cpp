@@ -37,10 +37,10 @@ CallResult UpdateClient::call(const std::string& method, const std::vector<Argum
     return result;
 }
 
-CallResult UpdateClient::install(const std::string& uri, const std::string& adapter,
+CallResult UpdateClient::install(const std::string& uri, const core::CimPath& target,
                                  std::vector<std::uint16_t> options, std::vector<std::string> values) const {
     return call("InstallFromURI",
-                {textArgument("URI", uri), pathArgument("Target", port(adapter)),
+                {textArgument("URI", uri), pathArgument("Target", target),
                  codesArgument("InstallOptions", options), textsArgument("InstallOptionsValues", values)});
 }
 

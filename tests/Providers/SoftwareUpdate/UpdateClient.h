@@ -31,9 +31,12 @@ class UpdateClient {
     }
 
     CallResult call(const std::string& method, const std::vector<core::Argument>& arguments) const;
-    /// InstallFromURI with options, by default {5}, on a port.
-    CallResult install(const std::string& uri, const std::string& adapter,
+    /// InstallFromURI with options, by default {5}, on an instance or on the port of an adapter.
+    CallResult install(const std::string& uri, const core::CimPath& target,
                        std::vector<std::uint16_t> options = {5}, std::vector<std::string> values = {}) const;
+    CallResult install(const std::string& uri, const char* adapter) const {
+        return install(uri, port(adapter));
+    }
 
     /// Follows the job to its end; fails the test when it takes too long.
     core::InstanceValue waitForEnd(const core::CimPath& job) const;
