@@ -141,9 +141,9 @@ void judge(int status, bool force, const std::string& uri, const std::string& ad
     }
 }
 
-}  // namespace
-
-PreparedImage examineImage(const UpdateOrder& order) {
+/// Reads, prepares and judges the image.
+/// @param isAskingAdapter  set while the adapter API is at work
+PreparedImage examine(const UpdateOrder& order, bool& isAskingAdapter) {
     const auto& [adapterName, uri, options, values] = order;
     utils::formatDebugLog(__FILE__, kCheckAndVerifyImage, __LINE__, "Checking URI : '%s' ", uri.c_str());
     const std::string path = locate(uri);
@@ -155,13 +155,22 @@ PreparedImage examineImage(const UpdateOrder& order) {
                         getTargetTypes(options, values)};
 
     utils::formatDebugLog(__FILE__, kCheckAndVerifyImage, __LINE__, "Start preparing the image");
+    isAskingAdapter = true;
     const int status = ma::prepareFlashImage(adapterName, source.get(), fileSize, image.bytes.get(),
                                              &image.size, image.types);
+    isAskingAdapter = false;
     utils::formatDebugLog(__FILE__, kCheckAndVerifyImage, __LINE__, "Image prepared %d", status);
     const bool force =
         Quenx_SoftwareInstallationService::IsValueDefined(InstallOption::ForceInstallation, options);
     judge(status, force, uri, adapterName);
     return image;
+}
+
+}  // namespace
+
+PreparedImage examineImage(const UpdateOrder& order) {
+    bool isAskingAdapter = false;
+    return examine(order, isAskingAdapter);
 }
 
 VerifiedImage verifyImage(const UpdateOrder& order) {
@@ -170,12 +179,14 @@ VerifiedImage verifyImage(const UpdateOrder& order) {
     // Before the first look at the image: preparing it may take seconds, and the verdict holds only while
     // nobody else writes to the adapter.
     claim.take(order.adapterName);
+    bool isAskingAdapter = false;
     try {
-        PreparedImage image = examineImage(order);
+        PreparedImage image = examine(order, isAskingAdapter);
         return {std::move(claim), std::move(image)};
     } catch (const utils::Exception& exception) {
-        // A refusal says that nothing was done to the adapter, so others may have it.
-        if (isRefusal(exception))
+        // A refusal says that nothing was done to the adapter, so others may have it. An exception of the
+        // adapter API does not say so, even where it has the type of a refusal.
+        if (isRefusal(exception) && !isAskingAdapter)
             claim.release();
         else
             claim.releaseIfConfigured();

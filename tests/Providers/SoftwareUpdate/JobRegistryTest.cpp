@@ -35,7 +35,6 @@ TEST_F(JobRegistryTest, TheConfigurationDecidesWhetherACheckGivesTheClaimBack) {
     for (const bool releases : {false, true}) {
         SCOPED_TRACE(releases);
         m_folder.write("quenx.conf", releases ? "ReleaseClaimAfterCheck = 1\n" : "\n");
-        m_backend->hook = nullptr;
         setClaim("");
         EXPECT_EQ(verify("eth0"), VerifyJobResult::Success);
         EXPECT_EQ(claim(), releases ? "" : "eth0");
@@ -44,13 +43,37 @@ TEST_F(JobRegistryTest, TheConfigurationDecidesWhetherACheckGivesTheClaimBack) {
         EXPECT_EQ(verify("eth0"), VerifyJobResult::TargetInUse);
         EXPECT_EQ(verify("eth1"), VerifyJobResult::JobIsRunning);
         EXPECT_EQ(claim(), "eth0");
-        setClaim("");
-        m_backend->hook = [](const std::string& operation, const std::string&) {
-            if (operation == "prepareFlashImage") throw std::runtime_error("broken");
+    }
+}
+
+TEST_F(JobRegistryTest, AnAdapterApiThatThrowsKeepsTheClaimWhateverTheType) {
+    struct Row {
+        std::function<void()> raise;
+        int code;
+        const char* line;
+    };
+    for (const Row& row : std::vector<Row>{
+             {[] { throw std::runtime_error("broken"); }, VerifyJobResult::UnspecifiedError, ""},
+             {[] { throw utils::Exception(std::string("of its own")); }, VerifyJobResult::UnspecifiedError,
+              ""},
+             {[] { throw utils::EUnspecifiedError("odd"); }, VerifyJobResult::UnspecifiedError, "Error:odd'"},
+             {[] { throw utils::EInvalidParameter("odd"); }, VerifyJobResult::InvalidParameter, "ter:odd'"},
+             {[] { throw EDowngradeDetected("odd"); }, VerifyJobResult::DowngradeDetected, "ed:odd'"},
+         }) {
+        m_backend->hook = [&](const std::string& operation, const std::string&) {
+            if (operation == "prepareFlashImage") row.raise();
         };
-        EXPECT_EQ(verify("eth0"), VerifyJobResult::UnspecifiedError);
-        EXPECT_FALSE(test::SyslogCapture::contains("Exception: 'broken"));
-        EXPECT_EQ(claim(), releases ? "" : "eth0");
+        for (const bool releases : {false, true}) {
+            SCOPED_TRACE(std::to_string(row.code) + row.line + (releases ? ", released" : ", kept"));
+            m_folder.write("quenx.conf",
+                           releases ? "ReleaseClaimAfterCheck=1\n" : "ReleaseClaimAfterCheck=0\n");
+            setClaim("");
+            test::SyslogCapture::clear();
+            EXPECT_EQ(verify("eth0"), row.code);
+            EXPECT_EQ(claim(), releases ? "" : "eth0");
+            EXPECT_EQ(test::SyslogCapture::contains("Exception: '"), *row.line != '\0');
+            EXPECT_TRUE(test::SyslogCapture::contains(row.line));
+        }
     }
 }
 
@@ -145,17 +168,14 @@ TEST_F(JobRegistryTest, RareCodesHaveTheirReturnValueAndLine) {
         std::uint32_t returnValue;
         std::string line;
     };
-    for (const Row& row : std::vector<Row>{
-             {4, 2, "Unspecified Error for '" + target + "'"},
-             {6, 4096, "Creation of new job returns: 6"},
-             {99, 4096, "Creation of new job returns: 99"},
-             {102, 4096, "Creation of new job returns: 102"},
-             {103, 2, "Job cannot read the URI for '" + target + "'"},
-             {106, 4, "Failed to start job for '" + target + "' "},
-             {107, 4096, "Creation of new job returns: 107"},
-             {-5, 4096, "Creation of new job returns: -5"},
-             {AnsweringRegistry::kThrow, 4100, "Allocation error occured for '" + target + "'"},
-         }) {
+    std::vector<Row> rows = {
+        {4, 2, "Unspecified Error for '" + target + "'"},
+        {103, 2, "Job cannot read the URI for '" + target + "'"},
+        {106, 4, "Failed to start job for '" + target + "' "},
+        {AnsweringRegistry::kThrow, 4100, "Allocation error occured for '" + target + "'"}};
+    for (const int success : {6, 99, 102, 107, -5})
+        rows.push_back({success, 4096, "Creation of new job returns: " + std::to_string(success)});
+    for (const Row& row : rows) {
         registry.code = row.code;
         const CallResult result = install("file:///x", "eth0");
         EXPECT_EQ(result.returnValue, row.returnValue) << row.code;
