@@ -18,9 +18,7 @@ class ProviderLibrary {
     }
     ProviderLibrary(const ProviderLibrary&) = delete;
     ProviderLibrary& operator=(const ProviderLibrary&) = delete;
-    ~ProviderLibrary() {
-        EXPECT_TRUE(m_handle == nullptr || dlclose(m_handle) == 0);
-    }
+    ~ProviderLibrary() { EXPECT_TRUE(m_handle == nullptr || dlclose(m_handle) == 0); }
 
     /// Whether unloading really takes a library out of this process.
     static bool isUnloadable() {

@@ -30,7 +30,7 @@ template <class T>
 std::vector<const T*> findInstances(const char* className) {
     try {
         const InstancesOf<const T> found(className);
-        return {found.begin(), found.end()};
+        return std::vector<const T*>(found.begin(), found.end());
     } catch (...) {
         return {};
     }
