@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// The provider's library goes while its jobs are new, running or finished, and comes back.
+// The provider's library goes while its jobs are running or finished, and comes back.
 #include <gtest/gtest.h>
 
 #include <filesystem>

@@ -108,35 +108,6 @@ TEST_F(JobRegistryTest, DeletesJobsAndNothingElse) {
     EXPECT_EQ(test::componentsOf("eth0"), "IMG_PXE 2, IMG_UEFI 1");
 }
 
-TEST_F(JobRegistryTest, TheAgentsEndFreesJobsInEveryState) {
-    waitForEnd(*install(m_uri, "eth0").job);
-    std::string uri = m_uri;
-    std::vector<std::uint16_t> options = {5};
-    std::vector<std::string> values;
-    registry().addJob(new Quenx_ConcreteJob("eth0", 77, uri, options, values));
-    setClaim("");
-    m_backend->hold("writeFlashImage");
-    EXPECT_EQ(install(m_uri, "eth1").returnValue, 4096U);
-    m_backend->waitUntilHeld();
-    const auto jobs = m_requests.enumerateInstances("Quenx_ConcreteJob");
-    ASSERT_EQ(jobs.size(), 3U);
-    EXPECT_EQ(state(jobs[0]), JobStateCompleted);
-    EXPECT_EQ(state(jobs[1]), JobStateNew);
-    EXPECT_EQ(state(jobs[2]), JobStateRunning);
-    // The agent waits for the flash, and says so.
-    test::SyslogCapture::observe([this](const std::string& line) {
-        if (line.find(", waiting for terminate") != std::string::npos) m_backend->letGo();
-    });
-    m_agent.reset();
-    test::SyslogCapture::observe(nullptr);
-    EXPECT_EQ(test::componentsOf("eth1"), "IMG_PXE 2, IMG_UEFI 1");
-    EXPECT_EQ(claim(), "");
-    EXPECT_EQ(test::SyslogCapture::count("Destroying JobThread") -
-                  test::SyslogCapture::count(", waiting for terminate"),
-              3U);
-    EXPECT_THROW(m_requests.enumerateInstances("Quenx_ConcreteJob"), core::CimError);
-}
-
 TEST_F(JobRegistryTest, TwoRequestsAtOnceGetOneClaim) {
     for (int round = 0; round < 20; ++round) {
         int results[2] = {};
