@@ -59,6 +59,10 @@ function(quenx_library name)
     target_link_libraries(${name} PUBLIC quenx_settings ${ARG_LINK})
     quenx_precompile(${name} library)
     target_link_options(${name} PRIVATE -Wl,--no-undefined-version -Wl,-z,relro,-z,now)
+    # What a library lacks fails here, not when a host loads it. Clang puts the sanitizers' runtime into programs alone.
+    if(NOT QUENX_SANITIZE)
+        target_link_options(${name} PRIVATE -Wl,-z,defs)
+    endif()
 endfunction()
 
 # quenx_provider(NAME SOURCES... [LINK targets...]): a library that a host loads, and that exports nothing. What it
