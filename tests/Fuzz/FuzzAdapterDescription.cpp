@@ -2,7 +2,7 @@
 #include <string>
 #include <string_view>
 
-#include "Fuzz/Require.h"
+#include "Fuzz/Fuzz.h"
 #include "MidAPI/AdapterTypes.h"
 #include "MidAPI/Simulator/Simulator.h"
 

@@ -5,7 +5,7 @@
 #include "CimXml/Response.h"
 #include "CimXml/WireError.h"
 #include "CimXml/Xml.h"
-#include "Fuzz/Require.h"
+#include "Fuzz/Fuzz.h"
 
 namespace {
 

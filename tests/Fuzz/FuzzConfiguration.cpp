@@ -4,7 +4,7 @@
 
 #include <string>
 
-#include "Fuzz/Require.h"
+#include "Fuzz/Fuzz.h"
 #include "Utils/Os/Linux/SMASHv2Config.h"
 #include "Utils/Os/Linux/linux.h"
 

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include <string>
 
-#include "Fuzz/Require.h"
+#include "Fuzz/Fuzz.h"
 #include "Providers/SoftwareUpdate/MethodResults.h"
 #include "Providers/SoftwareUpdate/Quenx_ConcreteJob.h"
 #include "Utils/Utils.h"

@@ -2,7 +2,7 @@
 #include <string>
 
 #include "Framework/Model/CimValue.h"
-#include "Fuzz/Require.h"
+#include "Fuzz/Fuzz.h"
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
     const std::string text(data, data + size);

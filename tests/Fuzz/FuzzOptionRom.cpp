@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include <algorithm>
 
-#include "Fuzz/Require.h"
+#include "Fuzz/Fuzz.h"
 #include "MidAPI/Image/ImagePreparation.h"
 #include "MidAPI/Image/OptionRomWriter.h"
 

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include <string>
 
-#include "Fuzz/Require.h"
+#include "Fuzz/Fuzz.h"
 #include "Utils/Os/Linux/linux.h"
 #include "Utils/Uri.h"
 

@@ -1,0 +1,18 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include <cstdlib>
+
+#include "Utils/Log.h"
+
+/// What must hold for every input: a finding of the fuzzer when it does not.
+inline void require(bool condition) {
+    if (!condition) std::abort();
+}
+
+/// libFuzzer calls it first. Refusals would each write a backtrace, which takes most of the time.
+extern "C" int LLVMFuzzerInitialize(int*, char***) {
+    utils::openLinuxLog();
+    utils::logLevel = 0;
+    return 0;
+}
