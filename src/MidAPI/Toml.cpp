@@ -160,12 +160,11 @@ std::string TomlTable::requiredText(std::string_view key, std::string_view examp
                   std::string(example) + "\"");
 }
 
-std::optional<std::uint64_t> TomlTable::number(std::string_view key, std::uint64_t highest) const {
+std::optional<std::int64_t> TomlTable::wholeNumber(std::string_view key, std::int64_t highest) const {
     const toml::node* node = m_table.get(key);
     if (node == nullptr) return std::nullopt;
     const auto* value = node->as_integer();
-    if (value != nullptr && value->get() >= 0 && static_cast<std::uint64_t>(value->get()) <= highest)
-        return static_cast<std::uint64_t>(value->get());
+    if (value != nullptr && value->get() >= 0 && value->get() <= highest) return value->get();
     fail(key, "\"" + std::string(key) + "\" must be a whole number from 0 to " + std::to_string(highest));
 }
 

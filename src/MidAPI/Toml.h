@@ -2,6 +2,7 @@
 #pragma once
 
 #include <cstdint>
+#include <limits>
 #include <optional>
 #include <span>
 #include <stdexcept>
@@ -51,7 +52,12 @@ class TomlTable {
 
     std::optional<std::string> text(std::string_view key) const;
     std::string requiredText(std::string_view key, std::string_view example) const;
-    std::optional<std::uint64_t> number(std::string_view key, std::uint64_t highest) const;
+    /// A whole number from 0 to the highest.
+    template <class T>
+    std::optional<T> number(std::string_view key, T highest = std::numeric_limits<T>::max()) const {
+        const auto value = wholeNumber(key, static_cast<std::int64_t>(highest));
+        return value ? std::optional(static_cast<T>(*value)) : std::nullopt;
+    }
     bool flag(std::string_view key, bool otherwise) const;
     /// The tables of an array of tables; none when the key is not there.
     std::vector<const toml::table*> tables(std::string_view key) const;
@@ -68,6 +74,7 @@ class TomlTable {
     }
 
   private:
+    std::optional<std::int64_t> wholeNumber(std::string_view key, std::int64_t highest) const;
     [[noreturn]] void failAt(const toml::source_region& where, const std::string& what) const;
 
     const toml::table& m_table;

@@ -17,7 +17,8 @@ namespace ma {
 namespace {
 
 constexpr std::size_t kLongestName = 64;
-constexpr std::uint64_t kLongestStall = 600'000;  // ten minutes, in milliseconds
+constexpr std::uint64_t kHighestSpeed = std::numeric_limits<std::int64_t>::max();  // all that TOML has
+constexpr std::uint32_t kLongestStall = 600'000;  // ten minutes, in milliseconds
 
 constexpr std::array<std::string_view, 14> kAdapterKeys = {
     "name", "description", "pci_address", "pci_id",    "subsystem_id", "mac",        "speed",
@@ -35,61 +36,46 @@ constexpr std::array<std::string_view, 8> kOperations = {"enumerate", "pci-addre
                                                          "boot-type", "info"};
 constexpr std::array<std::string_view, 5> kActions = {"fail", "throw", "stall", "power-loss", "kill"};
 
-/// Takes hexadecimal digits and then the separator (none when it is NUL) off the front of a text.
-bool takeHex(std::string_view& text, std::size_t fewest, std::size_t most, char separator,
-             std::uint32_t& value) {
+/// Takes so many hexadecimal digits and then the separator (none when it is NUL) off the front of a text.
+template <class T>
+bool takeHex(std::string_view& text, std::size_t digits, char separator, T& value) {
     // from_chars() takes neither signs nor blanks nor "0x", so what it takes is digits.
-    const char* end = text.data() + std::min(most, text.size());
+    const char* end = text.data() + std::min(digits, text.size());
     const auto result = std::from_chars(text.data(), end, value, 16);
-    const auto count = static_cast<std::size_t>(result.ptr - text.data());
-    if (result.ec != std::errc() || count < fewest) return false;
-    text.remove_prefix(count);
+    if (result.ec != std::errc() || result.ptr != text.data() + digits) return false;
+    text.remove_prefix(digits);
     if (separator == '\0') return text.empty();
-    if (text.empty() || text.front() != separator) return false;
+    if (!text.starts_with(separator)) return false;
     text.remove_prefix(1);
     return true;
 }
 
 bool parseIds(std::string_view text, std::uint16_t& vendor, std::uint16_t& device) {
-    std::uint32_t first = 0;
-    std::uint32_t second = 0;
-    if (!takeHex(text, 4, 4, ':', first) || !takeHex(text, 4, 4, '\0', second)) return false;
-    vendor = static_cast<std::uint16_t>(first);
-    device = static_cast<std::uint16_t>(second);
-    return true;
+    return takeHex(text, 4, ':', vendor) && takeHex(text, 4, '\0', device);
 }
 
 /// "0000:03:00.0"; the domain may be left out, and so may the function.
 bool parseAddress(std::string_view text, utils::PCIAddr& address) {
-    constexpr std::uint32_t kHighestDevice = 31;
-    constexpr std::uint32_t kHighestFunction = 7;
+    constexpr std::uint8_t kHighestDevice = 31;
+    constexpr std::uint8_t kHighestFunction = 7;
     // One spelling for one place: ports are told apart by this text, too.
     address.text = utils::lowerCase(text);
-    std::uint32_t domain = 0;
-    std::uint32_t bus = 0;
-    std::uint32_t device = 0;
-    std::uint32_t function = 0;
     if (std::count(text.begin(), text.end(), ':') == 2) {
-        if (!takeHex(text, 4, 4, ':', domain)) return false;
+        std::uint16_t domain = 0;
+        if (!takeHex(text, 4, ':', domain)) return false;
     } else {
         address.text = "0000:" + address.text;
     }
     address.noFunction = text.find('.') == std::string_view::npos;
-    if (!takeHex(text, 2, 2, ':', bus) || !takeHex(text, 2, 2, address.noFunction ? '\0' : '.', device))
-        return false;
-    if (!address.noFunction && !takeHex(text, 1, 1, '\0', function)) return false;
-    address.bus = static_cast<std::uint8_t>(bus);
-    address.device = static_cast<std::uint8_t>(device);
-    address.function = static_cast<std::uint8_t>(function);
-    return device <= kHighestDevice && function <= kHighestFunction;
+    if (!takeHex(text, 2, ':', address.bus)) return false;
+    if (!takeHex(text, 2, address.noFunction ? '\0' : '.', address.device)) return false;
+    if (!address.noFunction && !takeHex(text, 1, '\0', address.function)) return false;
+    return address.device <= kHighestDevice && address.function <= kHighestFunction;
 }
 
 bool parseMac(std::string_view text, std::array<std::uint8_t, 6>& mac) {
-    for (std::size_t index = 0; index < mac.size(); ++index) {
-        std::uint32_t value = 0;
-        if (!takeHex(text, 2, 2, index + 1 == mac.size() ? '\0' : ':', value)) return false;
-        mac[index] = static_cast<std::uint8_t>(value);
-    }
+    for (std::size_t index = 0; index < mac.size(); ++index)
+        if (!takeHex(text, 2, index + 1 == mac.size() ? '\0' : ':', mac[index])) return false;
     return true;
 }
 
@@ -102,9 +88,8 @@ bool isGoodName(std::string_view name) {
 utils::FirmwareVersionInfo readComponent(const TomlTable& table) {
     table.allowOnly(kComponentKeys);
     const std::size_t type = table.requiredChoice("type", kComponentTypes);
-    const std::uint64_t revision =
-        table.number("revision", std::numeric_limits<std::uint16_t>::max()).value_or(1);
-    return {static_cast<utils::FirmwareType>(type + 1), static_cast<std::uint32_t>(revision)};
+    const std::uint16_t revision = table.number<std::uint16_t>("revision").value_or(1);
+    return {static_cast<utils::FirmwareType>(type + 1), revision};
 }
 
 Fault readFault(const TomlTable& table) {
@@ -114,12 +99,11 @@ Fault readFault(const TomlTable& table) {
     Fault fault;
     fault.at = static_cast<Operation>(operation);
     fault.action = static_cast<Fault::Action>(action);
-    fault.percent = static_cast<std::uint16_t>(table.number("percent", 100).value_or(0));
-    fault.code = static_cast<std::uint32_t>(
-        table.number("code", std::numeric_limits<std::uint32_t>::max()).value_or(6));
+    fault.percent = table.number<std::uint16_t>("percent", 100).value_or(0);
+    fault.code = table.number<std::uint32_t>("code").value_or(6);
     fault.text = table.text("text").value_or("ordered fault: " + std::string(kActions[action]) + " at " +
                                              std::string(kOperations[operation]));
-    fault.milliseconds = static_cast<std::uint32_t>(table.number("milliseconds", kLongestStall).value_or(0));
+    fault.milliseconds = table.number<std::uint32_t>("milliseconds", kLongestStall).value_or(0);
     fault.once = table.flag("once", false);
     return fault;
 }
@@ -158,10 +142,10 @@ AdapterDescription readAdapter(const toml::table& node, const TomlTable& top, st
     readPlace(table, adapter);
     readIds(table, adapter.ids);
     adapter.description = table.text("description").value_or("");
-    adapter.speed = table.number("speed", std::numeric_limits<std::int64_t>::max()).value_or(0);
+    adapter.speed = table.number<std::uint64_t>("speed", kHighestSpeed).value_or(0);
     adapter.linkUp = table.flag("link", true);
     adapter.canBeUpdated = table.flag("updatable", true);
-    adapter.writeSpeed = table.number("write_speed", std::numeric_limits<std::int64_t>::max()).value_or(0);
+    adapter.writeSpeed = table.number<std::uint64_t>("write_speed", kHighestSpeed).value_or(0);
     adapter.bootType = static_cast<BootType>(table.choice("boot_type", kBootTypes).value_or(0));
     adapter.flashFile = table.text("flash_file").value_or("");
     for (const toml::table* component : table.tables("components"))

@@ -4,7 +4,9 @@
 #include <algorithm>
 #include <chrono>
 #include <csignal>
+#include <iterator>
 #include <thread>
+#include <utility>
 
 namespace ma {
 namespace {
@@ -14,9 +16,9 @@ void strike(const Fault& fault) {
         case Fault::Action::Fail:
             throw OperationFailure(fault.code, fault.text);
         case Fault::Action::Throw:
-            throw AdapterError(fault.text);
         case Fault::Action::PowerLoss:
-            throw PowerLoss(fault.text);
+            // Nothing on the way out repairs files, so an exception leaves them as a power cut would.
+            throw AdapterError(fault.text);
         case Fault::Action::Kill:
             std::raise(SIGKILL);
             break;
@@ -28,9 +30,6 @@ void strike(const Fault& fault) {
 
 }  // namespace
 
-PowerLoss::PowerLoss(const std::string& text) : AdapterError(text) {}
-PowerLoss::~PowerLoss() = default;
-
 FaultList::FaultList(std::vector<Fault> faults) {
     for (Fault& fault : faults)
         add(std::move(fault));
@@ -38,8 +37,7 @@ FaultList::FaultList(std::vector<Fault> faults) {
 
 void FaultList::add(Fault fault) {
     const utils::Mutex::AutoLocker lock(m_mutex);
-    // Faults may be equal; the number tells which one was used up.
-    m_entries.push_back({m_nextId++, std::move(fault)});
+    m_entries.push_back(std::make_shared<const Fault>(std::move(fault)));
 }
 
 void FaultList::clear() {
@@ -50,29 +48,25 @@ void FaultList::clear() {
 std::vector<FaultList::Entry> FaultList::armed(Operation operation) {
     const utils::Mutex::AutoLocker lock(m_mutex);
     std::vector<Entry> found;
-    for (const Entry& entry : m_entries)
-        if (entry.fault.at == operation) found.push_back(entry);
+    std::copy_if(m_entries.begin(), m_entries.end(), std::back_inserter(found),
+                 [operation](const Entry& entry) { return entry->at == operation; });
     return found;
 }
 
 bool FaultList::take(const Entry& entry) {
-    if (!entry.fault.once) return true;
+    if (!entry->once) return true;
     const utils::Mutex::AutoLocker lock(m_mutex);
-    return std::erase_if(m_entries, [&entry](const Entry& other) { return other.id == entry.id; }) != 0;
+    return std::erase(m_entries, entry) != 0;
 }
 
 FaultRun::FaultRun(FaultList& list, Operation operation) : m_list(list), m_pending(list.armed(operation)) {}
 
 void FaultRun::reach(unsigned int percent) {
-    for (std::size_t index = 0; index < m_pending.size();) {
-        if (m_pending[index].fault.percent > percent) {
-            ++index;
-            continue;
-        }
+    for (FaultList::Entry& entry : m_pending) {
+        if (entry == nullptr || entry->percent > percent) continue;
         // Off the list first: a fault that strikes throws.
-        const FaultList::Entry entry = std::move(m_pending[index]);
-        m_pending.erase(m_pending.begin() + static_cast<std::ptrdiff_t>(index));
-        if (m_list.take(entry)) strike(entry.fault);
+        const FaultList::Entry due = std::exchange(entry, nullptr);
+        if (m_list.take(due)) strike(*due);
     }
 }
 

@@ -2,6 +2,7 @@
 #pragma once
 
 #include <cstdint>
+#include <memory>
 #include <stdexcept>
 #include <string>
 #include <vector>
@@ -9,7 +10,6 @@
 #include "MidAPI/AdapterTypes.h"
 #include "Utils/Export.h"
 #include "Utils/Os/Linux/Mutex.h"
-#include "Utils/ThreadAnnotations.h"
 
 namespace ma {
 
@@ -31,7 +31,7 @@ struct Fault {
         Fail,       ///< the operation reports failure with `code` and `text` (Prepare: `code` is the status)
         Throw,      ///< it throws AdapterError with `text`
         Stall,      ///< it takes `milliseconds` longer
-        PowerLoss,  ///< it throws PowerLoss and leaves the files as they are at that moment
+        PowerLoss,  ///< it throws AdapterError and leaves the files as they are at that moment
         Kill,       ///< the process gets SIGKILL
     };
 
@@ -42,13 +42,6 @@ struct Fault {
     std::string text{};
     std::uint32_t milliseconds = 0;
     bool once = false;  ///< strikes one time only, instead of at every such operation
-};
-
-/// The power of a simulated adapter failed in the middle of an operation.
-class QUENX_EXPORT PowerLoss : public AdapterError {
-  public:
-    explicit PowerLoss(const std::string& text);
-    ~PowerLoss() override;
 };
 
 /// An operation failed, because it was refused or because of a fault of Action::Fail: how code and text
@@ -71,11 +64,9 @@ class FaultList {
     void clear();
 
   private:
-    struct Entry {
-        std::uint64_t id;
-        Fault fault;
-    };
     friend class FaultRun;
+    // Faults may be equal; the pointer tells which one was used up.
+    using Entry = std::shared_ptr<const Fault>;
 
     std::vector<Entry> armed(Operation operation);
     /// Uses a fault up when it is a one-shot; false when another operation was faster.
@@ -83,7 +74,6 @@ class FaultList {
 
     utils::Mutex m_mutex;
     std::vector<Entry> m_entries QUENX_GUARDED_BY(m_mutex);
-    std::uint64_t m_nextId QUENX_GUARDED_BY(m_mutex) = 0;
 };
 
 /// The faults that may strike during one operation, each at most once.
@@ -91,7 +81,7 @@ class FaultRun {
   public:
     FaultRun(FaultList& list, Operation operation);
 
-    /// Lets those strike whose percentage is reached. Throws OperationFailure, AdapterError or PowerLoss.
+    /// Lets those strike whose percentage is reached. Throws OperationFailure or AdapterError.
     void reach(unsigned int percent = 100);
 
   private:

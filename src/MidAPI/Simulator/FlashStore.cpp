@@ -1,11 +1,16 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "MidAPI/Simulator/FlashStore.h"
 
+#include <fcntl.h>
 #include <sys/stat.h>
+#include <unistd.h>
 
 #include <algorithm>
+#include <cerrno>
+#include <cstdio>
 #include <stdexcept>
 #include <string_view>
+#include <system_error>
 
 #include "MidAPI/Image/RomFormat.h"
 #include "Utils/Log.h"
@@ -39,7 +44,64 @@ constexpr std::size_t kChunk = 4096;  // a sector of the flash
 constexpr const char* kStateFile = "state";
 constexpr const char* kNewStateFile = "state.new";
 
+constexpr mode_t kFolderMode = 0755;
+constexpr mode_t kFileMode = 0644;
+
+[[noreturn]] void fail(const std::string& what) {
+    throw std::system_error(errno, std::generic_category(), what);
+}
+
+/// An open file of FlashFiles, closed with the scope.
+class FlashFile {
+  public:
+    FlashFile(FlashFiles& files, const std::string& path) : m_files(files), m_file(files.create(path)) {}
+    void write(std::span<const std::uint8_t> bytes) { m_files.write(m_file.number(), bytes); }
+    void sync() { m_files.sync(m_file.number()); }
+
+  private:
+    FlashFiles& m_files;
+    const os::Descriptor m_file;
+};
+
 }  // namespace
+
+FlashFiles::~FlashFiles() = default;
+
+void FlashFiles::makeFolder(const std::string& path) {
+    if (::mkdir(path.c_str(), kFolderMode) != 0 && errno != EEXIST) fail("cannot make the folder " + path);
+}
+
+int FlashFiles::create(const std::string& path) {
+    // A link in the state directory must not lead the daemon, which is root, to another file.
+    const int descriptor =
+        ::open(path.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC | O_NOFOLLOW, kFileMode);
+    if (descriptor < 0) fail("cannot write the file " + path);
+    return descriptor;
+}
+
+void FlashFiles::write(int descriptor, std::span<const std::uint8_t> bytes) {
+    // A signal, or a medium that is nearly full, ends a write early.
+    while (!bytes.empty()) {
+        const ssize_t written = ::write(descriptor, bytes.data(), bytes.size());
+        if (written < 0 && errno == EINTR) continue;
+        if (written < 0) fail("cannot write to the flash");
+        bytes = bytes.subspan(static_cast<std::size_t>(written));
+    }
+}
+
+void FlashFiles::sync(int descriptor) {
+    if (::fsync(descriptor) != 0) fail("cannot bring the flash to the medium");
+}
+
+void FlashFiles::rename(const std::string& from, const std::string& to) {
+    if (::rename(from.c_str(), to.c_str()) != 0) fail("cannot rename " + from);
+}
+
+void FlashFiles::syncFolder(const std::string& path) {
+    const os::Descriptor folder(::open(path.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+    if (folder.number() < 0) fail("cannot open the folder " + path);
+    if (::fsync(folder.number()) != 0) fail("cannot bring the folder " + path + " to the medium");
+}
 
 std::uint32_t crc32(std::span<const std::uint8_t> bytes) {
     std::uint32_t value = 0xFFFFFFFFU;

@@ -12,10 +12,33 @@
 #include <vector>
 
 #include "MidAPI/AdapterTypes.h"
-#include "MidAPI/Simulator/FlashFiles.h"
-#include "Utils/Os/Linux/FileLock.h"
+#include "Utils/Export.h"
+#include "Utils/Os/Linux/linux.h"
 
 namespace ma {
+
+/// Every change that the simulator makes to files, one system call each: the seam at which a test cuts the
+/// power. All operations throw std::system_error, which names the file and the reason. No state; may be used
+/// from any thread.
+class QUENX_EXPORT FlashFiles {
+  public:
+    FlashFiles() = default;
+    FlashFiles(const FlashFiles&) = delete;
+    FlashFiles& operator=(const FlashFiles&) = delete;
+    virtual ~FlashFiles();
+
+    /// Makes one folder; it may be there already.
+    virtual void makeFolder(const std::string& path);
+    /// Opens an empty file for writing, emptying one that is there; the caller closes the descriptor.
+    virtual int create(const std::string& path);
+    /// Writes all bytes at the end of what was written so far.
+    virtual void write(int descriptor, std::span<const std::uint8_t> bytes);
+    /// Returns when what was written is on the medium.
+    virtual void sync(int descriptor);
+    virtual void rename(const std::string& from, const std::string& to);
+    /// Returns when the entries of a folder (files made or renamed in it) are on the medium.
+    virtual void syncFolder(const std::string& path);
+};
 
 /// CRC-32 as in IEEE 802.3 (reflected, polynomial 0x04C11DB7, start and final inversion).
 std::uint32_t crc32(std::span<const std::uint8_t> bytes);

@@ -3,8 +3,10 @@
 
 #include <unistd.h>
 
+#include <chrono>
 #include <stdexcept>
 #include <system_error>
+#include <thread>
 
 #include "MidAPI/Image/ImagePreparation.h"
 #include "MidAPI/Image/OptionRomWriter.h"
@@ -109,8 +111,8 @@ std::string describeHolder(const std::string& adapter, pid_t holder) {
     return text + "process " + std::to_string(holder) + "; wait until it is done";
 }
 
-/// Runs an operation and turns what it throws into the API's code and text. PowerLoss and AdapterError, which
-/// faults throw, pass through.
+/// Runs an operation and turns what it throws into the API's code and text. AdapterError, which faults throw,
+/// passes through.
 template <typename Action>
 bool report(const std::string& adapter, std::uint32_t& errorCode, std::string& errorText, Action action) {
     errorCode = WriteError::NoError;
@@ -129,6 +131,36 @@ bool report(const std::string& adapter, std::uint32_t& errorCode, std::string& e
     return false;
 }
 
+/// Holds a writer back to the adapter's speed.
+class Pace {
+  public:
+    explicit Pace(std::uint64_t bytesPerSecond) : m_bytesPerSecond(bytesPerSecond) {}
+
+    void waitFor(std::size_t written) const {
+        if (m_bytesPerSecond == 0) return;
+        const double seconds = static_cast<double>(written) / static_cast<double>(m_bytesPerSecond);
+        std::this_thread::sleep_until(m_begin +
+                                      std::chrono::duration_cast<std::chrono::steady_clock::duration>(
+                                          std::chrono::duration<double>(seconds)));
+    }
+
+  private:
+    const std::uint64_t m_bytesPerSecond;
+    const std::chrono::steady_clock::time_point m_begin = std::chrono::steady_clock::now();
+};
+
+/// Marks the time during which an adapter is being written to, however that ends.
+class WritingScope {
+  public:
+    explicit WritingScope(Progress& progress) : m_progress(progress) { m_progress.begin(); }
+    WritingScope(const WritingScope&) = delete;
+    WritingScope& operator=(const WritingScope&) = delete;
+    ~WritingScope() { m_progress.end(); }
+
+  private:
+    Progress& m_progress;
+};
+
 }  // namespace
 
 SimulatedAdapter::SimulatedAdapter(AdapterDescription description, const std::string& stateDirectory,
@@ -146,16 +178,14 @@ std::vector<utils::FirmwareVersionInfo> SimulatedAdapter::components() {
     const std::uint32_t generation = m_store.state().generation;
     {
         const utils::Mutex::AutoLocker lock(m_cacheMutex);
-        if (m_cacheFilled && m_cacheGeneration == generation) return m_cachedComponents;
+        if (m_cache && m_cache->generation == generation) return m_cache->components;
     }
     const std::vector<std::uint8_t> flash = m_store.content();
     std::vector<utils::FirmwareVersionInfo> found;
     if (!flash.empty()) found = parseOptionRom(flash).components();
     const utils::Mutex::AutoLocker lock(m_cacheMutex);
     // The content may be newer than the number; then the next query reads once more.
-    m_cacheFilled = true;
-    m_cacheGeneration = generation;
-    m_cachedComponents = found;
+    m_cache = Cache{generation, found};
     return found;
 }
 

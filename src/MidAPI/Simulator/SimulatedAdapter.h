@@ -1,8 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include <algorithm>
 #include <cstdint>
 #include <memory>
+#include <optional>
 #include <span>
 #include <string>
 #include <vector>
@@ -12,11 +14,45 @@
 #include "MidAPI/Simulator/AdapterDescription.h"
 #include "MidAPI/Simulator/Fault.h"
 #include "MidAPI/Simulator/FlashStore.h"
-#include "MidAPI/Simulator/Progress.h"
 #include "Utils/Os/Linux/Mutex.h"
-#include "Utils/ThreadAnnotations.h"
 
 namespace ma {
+
+/// The percentage of an adapter's update. Thread-safe.
+class Progress {
+  public:
+    std::uint16_t percent() const {
+        const utils::Mutex::AutoLocker lock(m_mutex);
+        return m_percent;
+    }
+
+    /// An image was prepared: a new update is at its beginning, unless one is being written.
+    void prepared() {
+        const utils::Mutex::AutoLocker lock(m_mutex);
+        if (!m_writing) m_percent = 0;
+    }
+
+    void begin() {
+        const utils::Mutex::AutoLocker lock(m_mutex);
+        m_writing = true;
+        m_percent = 0;
+    }
+
+    void advance(std::uint16_t percent) {
+        const utils::Mutex::AutoLocker lock(m_mutex);
+        m_percent = std::max(m_percent, percent);
+    }
+
+    void end() {
+        const utils::Mutex::AutoLocker lock(m_mutex);
+        m_writing = false;
+    }
+
+  private:
+    mutable utils::Mutex m_mutex;
+    bool m_writing QUENX_GUARDED_BY(m_mutex) = false;
+    std::uint16_t m_percent QUENX_GUARDED_BY(m_mutex) = 0;
+};
 
 /// One simulated adapter port: the operations of ma.h for it. Thread-safe.
 class SimulatedAdapter {
@@ -54,11 +90,13 @@ class SimulatedAdapter {
     FaultList m_faults;
     Progress m_progress;
 
-    // What the flash held when it was last read, so that a query need not read it again.
+    /// What the flash held when it was last read, so that a query need not read it again.
+    struct Cache {
+        std::uint32_t generation;
+        std::vector<utils::FirmwareVersionInfo> components;
+    };
     utils::Mutex m_cacheMutex;
-    bool m_cacheFilled QUENX_GUARDED_BY(m_cacheMutex) = false;
-    std::uint32_t m_cacheGeneration QUENX_GUARDED_BY(m_cacheMutex) = 0;
-    std::vector<utils::FirmwareVersionInfo> m_cachedComponents QUENX_GUARDED_BY(m_cacheMutex);
+    std::optional<Cache> m_cache QUENX_GUARDED_BY(m_cacheMutex);
 };
 
 }  // namespace ma

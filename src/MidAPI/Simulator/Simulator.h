@@ -8,13 +8,12 @@
 #include "MidAPI/Backend.h"
 #include "MidAPI/Simulator/AdapterDescription.h"
 #include "MidAPI/Simulator/Fault.h"
-#include "MidAPI/Simulator/FlashFiles.h"
+#include "MidAPI/Simulator/FlashStore.h"
 #include "Utils/Export.h"
 
 namespace ma {
 
 class SimulatedAdapter;
-struct FlashState;
 
 /// The backend of simulated adapters. Several processes may work on one state directory.
 class QUENX_EXPORT Simulator : public Backend {
