@@ -3,7 +3,7 @@
 #include <benchmark/benchmark.h>
 #include <dlfcn.h>
 
-#include "Framework/Classes/InstanceReaper.h"
+#include "Framework/Classes/InstanceLifetime.h"
 #include "Framework/Requests/CimRequests.h"
 #include "InstantAdapters.h"
 #include "Providers/SoftwareUpdate/Quenx_ConcreteJob.h"

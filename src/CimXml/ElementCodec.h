@@ -8,7 +8,7 @@
 
 #include "CimXml/Xml.h"
 #include "Framework/Model/ClassDeclaration.h"
-#include "Framework/Requests/RequestValues.h"
+#include "Framework/Requests/CimOperations.h"
 
 namespace cimxml {
 

@@ -7,7 +7,7 @@
 #include <variant>
 #include <vector>
 
-#include "Framework/Requests/RequestValues.h"
+#include "Framework/Requests/CimOperations.h"
 
 namespace cimxml {
 

@@ -12,7 +12,7 @@
 
 #include "Framework/Model/CimError.h"
 #include "Framework/Model/ClassDeclaration.h"
-#include "Framework/Requests/RequestValues.h"
+#include "Framework/Requests/CimOperations.h"
 
 namespace cimxml {
 

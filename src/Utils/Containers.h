@@ -11,7 +11,6 @@
 #include "Utils/Exception.h"
 #include "Utils/Export.h"
 #include "Utils/Os/Linux/Mutex.h"
-#include "Utils/ThreadAnnotations.h"
 
 namespace utils {
 

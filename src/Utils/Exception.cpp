@@ -6,7 +6,6 @@
 
 #include "Utils/Log.h"
 #include "Utils/Utils.h"
-#include "Utils/VFormat.h"
 
 namespace utils {
 

@@ -15,7 +15,6 @@
 
 #include "Utils/Os/Linux/linux.h"
 #include "Utils/Utils.h"
-#include "Utils/VFormat.h"
 
 namespace utils {
 
@@ -23,12 +22,12 @@ std::atomic<std::int32_t> logLevel{-1};
 
 namespace {
 
-constexpr const char* levelVariable = "TARVEL_SMASHv2_LOG_LEVEL";
-constexpr const char* copyVariable = "QUENX_LOG";
-constexpr const char* banner = "Quenx Management Provider, Tarvel, 2026";
-constexpr int backtraceDepth = 40;
+constexpr const char* kLevelVariable = "TARVEL_SMASHv2_LOG_LEVEL";
+constexpr const char* kCopyVariable = "QUENX_LOG";
+constexpr const char* kBanner = "Quenx Management Provider, Tarvel, 2026";
+constexpr int kBacktraceDepth = 40;
 // logBacktrace itself, the writer that called it, and the writer's caller.
-constexpr std::size_t skippedFrames = 3;
+constexpr std::size_t kSkippedFrames = 3;
 
 std::mutex openMutex;
 
@@ -53,7 +52,7 @@ class ErrnoKeeper {
 };
 
 std::int32_t levelFromEnvironment() noexcept {
-    const char* const text = os::getEnvVariable(levelVariable);
+    const char* const text = os::getEnvVariable(kLevelVariable);
     if (text != nullptr && text[0] == '0') return 0;
     if (text != nullptr && text[0] == '2') return 2;
     return 1;
@@ -62,7 +61,7 @@ std::int32_t levelFromEnvironment() noexcept {
 /// syslog's own copy to standard error serves where no system log runs. The console, syslog's way out there,
 /// is then left alone: in a container it is often the same terminal.
 int openOptions() noexcept {
-    const char* const text = os::getEnvVariable(copyVariable);
+    const char* const text = os::getEnvVariable(kCopyVariable);
     return text != nullptr && std::strcmp(text, "stderr") == 0 ? LOG_PERROR : LOG_CONS;
 }
 
@@ -99,6 +98,21 @@ void handOver(int priority, const std::string& line, const ErrnoKeeper& callersE
 }
 #pragma GCC diagnostic pop
 
+/// Inlined for the backtrace's sake, which leaves out a fixed number of frames up to the call site.
+template <class Write>
+[[gnu::always_inline, gnu::format(printf, 5, 0)]] inline void formatAndWrite(Write write, const char* file,
+                                                                             const char* function, int line,
+                                                                             const char* format,
+                                                                             va_list arguments) noexcept {
+    const ErrnoKeeper callersErrno;
+    try {
+        std::string message = vformatStr(format, arguments);
+        callersErrno.restore();
+        write(file, function, line, std::move(message));
+    } catch (...) {
+    }
+}
+
 }  // namespace
 
 void openLinuxLog() noexcept {
@@ -109,7 +123,7 @@ void openLinuxLog() noexcept {
     const std::int32_t level = levelFromEnvironment();
     openlog("quenx", openOptions(), LOG_USER);
     syslog(LOG_NOTICE, "Opening log, level=%d", level);
-    syslog(LOG_NOTICE, "%s", banner);
+    syslog(LOG_NOTICE, "%s", kBanner);
     logLevel.store(level);
 }
 
@@ -138,7 +152,7 @@ __attribute__((noinline)) void writeErrorLog(const char* file, const char* funct
         handOver(LOG_ERR, formatLogMessage(file, function, line, "error", message), callersErrno);
     } catch (...) {
     }
-    logBacktrace(LOG_ERR, backtraceDepth, logLevel.load() > 1);
+    logBacktrace(LOG_ERR, kBacktraceDepth, logLevel.load() > 1);
 }
 
 void writeDebugLog(const char* file, const char* function, int line, std::string message) noexcept {
@@ -161,7 +175,7 @@ __attribute__((noinline)) void logBacktrace(int priority, int depth, bool withSy
         frames.resize(static_cast<std::size_t>(captured));
 
         std::string text = "  Backtrace: ";
-        for (std::size_t i = skippedFrames; i < frames.size(); ++i) {
+        for (std::size_t i = kSkippedFrames; i < frames.size(); ++i) {
             text += formatStr("%08" PRIxPTR " ", reinterpret_cast<std::uintptr_t>(frames[i]));
         }
         handOver(priority, text, callersErrno);
@@ -170,7 +184,7 @@ __attribute__((noinline)) void logBacktrace(int priority, int depth, bool withSy
         const std::unique_ptr<char*, decltype(&std::free)> symbols(backtrace_symbols(frames.data(), captured),
                                                                    &std::free);
         if (symbols == nullptr) return;
-        for (std::size_t i = skippedFrames; i < frames.size(); ++i) {
+        for (std::size_t i = kSkippedFrames; i < frames.size(); ++i) {
             handOver(priority, formatStr("  %s ", symbols.get()[i]), callersErrno);
         }
     } catch (...) {
@@ -179,29 +193,17 @@ __attribute__((noinline)) void logBacktrace(int priority, int depth, bool withSy
 
 void formatDebugLog(const char* file, const char* function, int line, const char* format, ...) noexcept {
     if (!isDebugLogged()) return;
-    const ErrnoKeeper callersErrno;
     va_list arguments;
     va_start(arguments, format);
-    try {
-        std::string message = vformatStr(format, arguments);
-        callersErrno.restore();
-        writeDebugLog(file, function, line, std::move(message));
-    } catch (...) {
-    }
+    formatAndWrite(writeDebugLog, file, function, line, format, arguments);
     va_end(arguments);
 }
 
 void formatErrorLog(const char* file, const char* function, int line, const char* format, ...) noexcept {
     if (!isErrorLogged()) return;
-    const ErrnoKeeper callersErrno;
     va_list arguments;
     va_start(arguments, format);
-    try {
-        std::string message = vformatStr(format, arguments);
-        callersErrno.restore();
-        writeErrorLog(file, function, line, std::move(message));
-    } catch (...) {
-    }
+    formatAndWrite(writeErrorLog, file, function, line, format, arguments);
     va_end(arguments);
 }
 

@@ -8,7 +8,6 @@
 #include <ctime>
 
 #include "Utils/Log.h"
-#include "Utils/VFormat.h"
 
 namespace utils {
 

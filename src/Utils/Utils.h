@@ -2,6 +2,7 @@
 #pragma once
 
 #include <algorithm>
+#include <cstdarg>
 #include <cstdint>
 #include <string>
 #include <string_view>
@@ -14,7 +15,8 @@
 /// std::bad_alloc and nothing else.
 namespace utils {
 
-/// The expansion of a printf format, cut at 511 characters.
+/// The expansion of a printf format, cut at 511 characters. The first form is for this library alone.
+std::string vformatStr(const char* format, va_list arguments) __attribute__((format(printf, 1, 0)));
 QUENX_EXPORT std::string formatStr(const char* format, ...) __attribute__((format(printf, 1, 2)));
 
 /// The local wall-clock time as "hh:mm:ss", "??:??:??" when it cannot be had.

@@ -2,13 +2,17 @@
 #include <gtest/gtest.h>
 
 #include "Framework/Model/CimError.h"
+#include "Framework/Model/CimPropertyList.h"
 #include "Support/TestModel.h"
 
 namespace {
 
 TEST(CimPropertyTest, ChecksAllOfAModificationFirst) {
     test::Gadget gadget("x");
-    gadget.Caption.setLengthBounds(2, 5);
+    core::CimPropertyString::CheckMinLengthListener shortest(2);
+    core::CimPropertyString::CheckMaxLengthListener longest(5);
+    gadget.Caption.addListener(&shortest);
+    gadget.Caption.addListener(&longest);
     const auto modify = [&](const char* name, core::CimValue value) {
         core::CimPropertyList requested;
         requested.add("Codes", core::CimValue::arrayOf(core::CimType::Uint16, {std::uint64_t{9}}));
@@ -63,11 +67,9 @@ TEST(CimPropertyTest, RefersToATargetThatHasGone) {
     core::InstanceList list;
     auto* target = new test::Gadget("t");
     list.add(target);
-    test::Link link(*target, *target);
-    EXPECT_EQ(link.From.getInstance().get(), target);
+    const test::Link link(*target, *target);
     list.clear();
-    EXPECT_EQ(link.From.getInstance(), nullptr);
-    EXPECT_EQ(link.From.toString(), "Test_Gadget.ID=\"t\",Number=0");
+    EXPECT_EQ(link.From.getPath().toString(), "Test_Gadget.ID=\"t\",Number=0");
 }
 
 }  // namespace

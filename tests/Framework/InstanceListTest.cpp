@@ -5,9 +5,11 @@
 #include <unistd.h>
 
 #include <cstdlib>
+#include <future>
+#include <thread>
 
-#include "Framework/Classes/CimAgent.h"
-#include "Framework/Classes/InstanceReaper.h"
+#include "Framework/Classes/CimBroker.h"
+#include "Framework/Classes/InstanceLifetime.h"
 #include "Support/TestModel.h"
 
 namespace {
@@ -93,6 +95,33 @@ TEST_F(InstanceListTest, DestroysInstancesUntilTheProcessHasEnded) {
             std::exit(0);
         },
         testing::ExitedWithCode(0), "");
+}
+
+std::size_t countGadgets() {
+    return core::GetCimBroker()->getInstances("test_GADGET", "").size();
+}
+
+TEST(CimBrokerTest, LetsAnAgentGoOnlyAfterTheRequestsThatUseIt) {
+    auto agent = std::make_unique<test::GadgetAgent>();
+    const test::Gadget* gadget = agent->add("held");
+    std::promise<void> enumerated;
+    std::promise<void> proceed;
+    auto request = std::async(std::launch::async, [&] {
+        const core::RequestScope scope;
+        EXPECT_EQ(countGadgets(), 1U);
+        enumerated.set_value();
+        proceed.get_future().wait();
+        return gadget->ID.get();
+    });
+    enumerated.get_future().wait();
+    auto leaving = std::async(std::launch::async, [&] { agent.reset(); });
+    while (countGadgets() != 0)
+        std::this_thread::yield();
+    EXPECT_EQ(test::Gadget::living, 1);
+    proceed.set_value();
+    EXPECT_EQ(request.get(), "held");
+    leaving.wait();
+    EXPECT_EQ(test::Gadget::living, 0);
 }
 
 }  // namespace

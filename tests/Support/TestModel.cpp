@@ -4,6 +4,7 @@
 #include <numeric>
 
 #include "Framework/Model/CimError.h"
+#include "Framework/Model/CimPropertyList.h"
 #include "Utils/Exception.h"
 
 namespace test {

@@ -6,8 +6,7 @@
 
 #include "Framework/Classes/CimBroker.h"
 #include "Framework/Model/CimInstance.h"
-#include "Framework/Model/CimProperties.h"
-#include "Framework/Model/CimPropertyRef.h"
+#include "Framework/Model/CimProperty.h"
 
 namespace test {
 

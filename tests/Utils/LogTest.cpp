@@ -13,13 +13,14 @@
 #include <vector>
 
 #include "Support/SyslogCapture.h"
+#include "Utils/Exception.h"
 
 using test::LogLevelGuard;
 using test::SyslogCapture;
 
 namespace {
 
-constexpr const char* levelVariable = "TARVEL_SMASHv2_LOG_LEVEL";
+constexpr const char* kLevelVariable = "TARVEL_SMASHv2_LOG_LEVEL";
 
 std::string firstLine() {
     const auto lines = SyslogCapture::lines();
@@ -37,7 +38,7 @@ TEST(LogTest, TakesItsLevelFromTheFirstCharacterOfTheVariable) {
     for (const auto& row : rows) {
         SyslogCapture::clear();
         utils::logLevel = -1;
-        row.value == nullptr ? unsetenv(levelVariable) : setenv(levelVariable, row.value, 1);
+        row.value == nullptr ? unsetenv(kLevelVariable) : setenv(kLevelVariable, row.value, 1);
         utils::writeDebugLog("f", "g", 1, "debug text");
         utils::writeErrorLog("f", "g", 1, "error text");
 
@@ -48,7 +49,7 @@ TEST(LogTest, TakesItsLevelFromTheFirstCharacterOfTheVariable) {
         EXPECT_EQ(SyslogCapture::count("[debug] \"debug text\" (g@f:1)"), row.level == 2 ? 1U : 0U);
         EXPECT_EQ(SyslogCapture::count("[error] \"error text\" (g@f:1)"), row.level >= 1 ? 1U : 0U);
     }
-    unsetenv(levelVariable);
+    unsetenv(kLevelVariable);
 }
 
 TEST(LogTest, OpensOnceForTheFirstLinesOfManyThreads) {
@@ -128,4 +129,17 @@ TEST(LogTest, OffersVpddbgByItsPlainNameWhichDropsNewlines) {
     entry("a\n%s\n", "b\nc");
     EXPECT_EQ(SyslogCapture::messages(), std::vector<std::string>{"abc"});
     EXPECT_TRUE(SyslogCapture::contains("(vpddbg@Utils.cpp:"));
+}
+
+TEST(ExceptionTest, PrefixesOnlyATextAndLogsItBare) {
+    const LogLevelGuard guard(1);
+    EXPECT_STREQ(utils::Exception("wrong value %d", 7).what(), "wrong value 7");
+    EXPECT_STREQ(utils::Exception(std::string("a%n%s")).what(), "SMASHv2:a%n%s");
+    EXPECT_EQ(SyslogCapture::messages("error"), (std::vector<std::string>{"wrong value 7", "a%n%s"}));
+    EXPECT_EQ(SyslogCapture::count("(Exception@Exception.cpp:"), 2U);
+    EXPECT_EQ(SyslogCapture::count("  Backtrace: "), 2U);
+    // A format is cut, a text is not.
+    const std::string text(600, 'x');
+    EXPECT_EQ(utils::Exception("%s", text.c_str()).what(), text.substr(0, 511));
+    EXPECT_EQ(utils::Exception(text).what(), "SMASHv2:" + text);
 }

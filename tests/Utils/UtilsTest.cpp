@@ -17,16 +17,8 @@ TEST(UtilsTest, FoldsLettersOfAsciiOnly) {
     EXPECT_FALSE(utils::equalsIgnoringCase("[", "{"));
 }
 
-TEST(UtilsTest, WritesBytesAndQuotesThatReadersTakeBack) {
-    EXPECT_EQ(utils::hexByte(0xF0) + utils::hexByte(0x0A), "f00a");
-    EXPECT_EQ(utils::quoted("a\"\\"), "\"a\\\"\\\\\"");
-}
-
 TEST(UtilsTest, KeepsEmptyPiecesWhenSplitting) {
     using utils::split;
     EXPECT_EQ(split("::a:", ':'), (utils::StringArray{"", "", "a", ""}));
     EXPECT_EQ(split("", ':'), (utils::StringArray{""}));
-    EXPECT_EQ(utils::trim(" \t a b\t "), "a b");
-    EXPECT_EQ(utils::trim(" \t"), "");
-    EXPECT_EQ(utils::trim("a\n"), "a\n");
 }

@@ -7,7 +7,7 @@
 #include <string_view>
 #include <vector>
 
-#include "Framework/Requests/RequestValues.h"
+#include "Framework/Requests/CimOperations.h"
 
 /// Reading properties of instances as plain values.
 namespace cli {

@@ -6,7 +6,7 @@
 #include <string>
 #include <vector>
 
-#include "Framework/Requests/RequestValues.h"
+#include "Framework/Requests/CimOperations.h"
 
 /// Results, as text for a person and as JSON for a script.
 namespace cli {

@@ -3,60 +3,50 @@
 
 #include <algorithm>
 
-#include "Framework/Classes/RequestScope.h"
+#include "Framework/Classes/InstanceLifetime.h"
+#include "Framework/Classes/InstanceList.h"
 #include "Framework/Model/CimInstance.h"
-#include "Framework/Model/CimPath.h"
+#include "Framework/Model/CimValue.h"
 
 namespace core {
 
-namespace {
+CimAgent::CimAgent(std::string providerName) : m_providerName(std::move(providerName)) {
+    // An agent of static storage that is never unloaded destroys its instances when the process exits.
+    prepareReaper();
+}
 
-using List = utils::SafeList<CimInstance*>;
+CimAgent::~CimAgent() {
+    leaveBroker();
+}
 
-/// Several enumerations, one behind the other. Keeps them, and with them their elements.
-class JoinedIterator : public List::IteratorImplementation {
-  public:
-    explicit JoinedIterator(std::vector<List::Iterator> parts)
-        : m_joined(std::make_shared<Joined>(std::move(parts))) {}
-    JoinedIterator(const JoinedIterator& other) : IteratorImplementation(), m_joined(other.m_joined) {}
+bool CimAgent::isClassSupported(std::string className) {
+    return m_classes.find(className) != nullptr;
+}
 
-    CimInstance* first() override {
-        m_position = 0;
-        return next();
-    }
+utils::SafeList<CimInstance*>::Iterator CimAgent::getInstances(std::string className) {
+    const ServedClass* served = m_classes.find(className);
+    return served == nullptr ? joinInstances({}) : served->object->getInstances();
+}
 
-    CimInstance* next() override {
-        while (m_position < m_joined->elements.size()) {
-            CimInstance* element = m_joined->elements[m_position++];
-            if (!element->isDeleted()) return element;
-        }
-        return nullptr;
-    }
+void CimAgent::createInstance(CimInstance* instance) {
+    if (const ServedClass* served = m_classes.find(instance->getClassName()))
+        served->object->createInstance(instance);
+}
 
-    std::size_t size() override { return m_joined->elements.size(); }
+void CimAgent::enableIndications(std::string className) {
+    if (const ServedClass* served = m_classes.find(className)) served->object->enableIndications();
+}
 
-    std::unique_ptr<IteratorImplementation> clone() override {
-        return std::make_unique<JoinedIterator>(*this);
-    }
+void CimAgent::disableIndications(std::string className) {
+    if (const ServedClass* served = m_classes.find(className)) served->object->disableIndications();
+}
 
-  private:
-    struct Joined {
-        explicit Joined(std::vector<List::Iterator> all) : parts(std::move(all)) {
-            for (List::Iterator& part : parts) {
-                for (CimInstance* element = part.first(); element != nullptr; element = part.next()) {
-                    elements.push_back(element);
-                }
-            }
-        }
-        std::vector<List::Iterator> parts;
-        std::vector<CimInstance*> elements;
-    };
-
-    std::shared_ptr<const Joined> m_joined;
-    std::size_t m_position = 0;
-};
-
-}  // namespace
+void CimAgent::leaveBroker() noexcept {
+    GetCimBroker()->removeAgent(this);
+    m_classes.clear();
+    // A deleted job may still be flashing, and its code is the library's that is about to unload.
+    drainReaper();
+}
 
 AgentUse::AgentUse(std::shared_ptr<AgentRegistration> registration) noexcept
     : m_registration(std::move(registration)) {
@@ -74,6 +64,7 @@ CimBroker::CimBroker() = default;
 CimBroker::~CimBroker() = default;
 
 void CimBroker::addAgent(CimAgent* agent) {
+    // Shared with the requests that use the agent, which count themselves in it.
     auto registration = std::make_shared<AgentRegistration>();
     registration->agent = agent;
     const utils::Mutex::AutoLocker lock(m_mutex);
@@ -98,6 +89,7 @@ void CimBroker::removeAgent(CimAgent* agent) noexcept {
 
 std::vector<AgentUse> CimBroker::useAgents() {
     RequestScope* scope = RequestScope::current();
+    // Counted under the lock: an agent that has left the list gets no new users, so its wait can end.
     const utils::Mutex::AutoLocker lock(m_mutex);
     std::vector<AgentUse> uses;
     uses.reserve(m_agents.size());
@@ -112,16 +104,16 @@ CimInstance* CimBroker::getInstanceByPath(CimPath& path) {
     if (!path.isValid()) return nullptr;
     for (const AgentUse& use : useAgents()) {
         if (!use.agent().isClassSupported(path.getClassName())) continue;
-        List::Iterator instances = use.agent().getInstances(path.getClassName());
-        for (CimInstance* instance = instances.first(); instance != nullptr; instance = instances.next()) {
+        for (CimInstance* instance : InstanceRange(use.agent().getInstances(path.getClassName()))) {
             if (path.isSameObjectAs(*instance)) return instance;
         }
     }
     return nullptr;
 }
 
-List::Iterator CimBroker::getInstances(std::string className, std::string providerName) {
-    std::vector<List::Iterator> parts;
+utils::SafeList<CimInstance*>::Iterator CimBroker::getInstances(std::string className,
+                                                                std::string providerName) {
+    std::vector<utils::SafeList<CimInstance*>::Iterator> parts;
     for (const AgentUse& use : useAgents()) {
         CimAgent& agent = use.agent();
         if (!providerName.empty() && agent.getProviderName() != providerName) continue;
@@ -129,10 +121,12 @@ List::Iterator CimBroker::getInstances(std::string className, std::string provid
     }
     // The usual case, without a copy of all elements.
     if (parts.size() == 1) return std::move(parts.front());
-    return List::Iterator(std::make_unique<JoinedIterator>(std::move(parts)));
+    return joinInstances(std::move(parts));
 }
 
 CimBroker* GetCimBroker() {
+    // Static storage of the lowest library that knows it: it is built before, and destroyed after, the
+    // agents.
     static CimBroker broker;
     return &broker;
 }

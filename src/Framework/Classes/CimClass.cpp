@@ -7,6 +7,7 @@ namespace core {
 
 namespace {
 
+/// Clients may ask for the declaration of whatever they can enumerate.
 ClassChain undeclared(const std::string& name) {
     auto declaration = std::make_shared<ClassDeclaration>();
     declaration->name = name;
@@ -18,8 +19,7 @@ ClassChain undeclared(const std::string& name) {
 CimClass::CimClass() = default;
 
 utils::SafeList<CimInstance*>::Iterator CimClass::getInstances() {
-    using List = utils::SafeList<CimInstance*>;
-    return List::Iterator(std::make_unique<List::SimpleIteratorImplementation>(nullptr));
+    return joinInstances({});
 }
 
 void CimClass::createInstance(CimInstance*) {}
@@ -37,12 +37,14 @@ CimClasses::~CimClasses() {
 }
 
 void CimClasses::append(ServedClass served) {
+    // Read once, here: requests look classes up by name all the time.
     served.name = served.object->getClassName();
     served.chain = served.info == nullptr ? undeclared(served.name) : declarationsOf(*served.info);
     for (const auto* level = served.info; level != nullptr; level = level->superclass) {
         for (const CimClassInfo* mentioned : level->mentioned)
             served.mentioned.push_back(declarationsOf(*mentioned));
     }
+    // On the heap, since look-ups give out pointers that later additions must not move.
     auto kept = std::make_unique<ServedClass>(std::move(served));
     const utils::Mutex::AutoLocker lock(m_mutex);
     m_served.push_back(std::move(kept));

@@ -3,8 +3,7 @@
 
 #include <algorithm>
 
-#include "Framework/Classes/InstanceReaper.h"
-#include "Framework/Classes/RequestScope.h"
+#include "Framework/Classes/InstanceLifetime.h"
 #include "Framework/Model/CimInstance.h"
 
 namespace core {
@@ -47,6 +46,8 @@ void holdInScope(std::shared_ptr<const void> object) {
 
 }  // namespace
 
+/// A list and its instances end in any order: an instance that a request still holds outlives its list, and
+/// may be marked as deleted after that. So both look at each other through this.
 class InstanceList::Link : public InstanceListLink {
   public:
     explicit Link(InstanceList* list) : m_list(list) {}
@@ -71,6 +72,7 @@ InstanceList::InstanceList() : m_link(std::make_shared<Link>(this)) {
 }
 
 InstanceList::~InstanceList() {
+    // First, so that no instance reaches a list that is half gone.
     m_link->close();
     clear();
     setElementOwner(nullptr);
@@ -88,6 +90,7 @@ InstanceList::Iterator InstanceList::getElements(bool) {
 
 InstanceList::SharedSnapshot InstanceList::snapshot() {
     const utils::Mutex::AutoLocker lock(getMutex());
+    // Kept until the list changes: most lists are read far more often than they change.
     if (m_cached == nullptr) m_cached = std::make_shared<const Snapshot>(m_held);
     return m_cached;
 }
@@ -100,6 +103,7 @@ void InstanceList::add(CimInstance* element) {
     SharedSnapshot outdated;
     const utils::Mutex::AutoLocker lock(getMutex());
     m_held.push_back(owned);
+    // The base's list has to name the same elements, whatever happens: callers may walk it.
     try {
         getStlList().push_back(element);
     } catch (...) {
@@ -150,6 +154,18 @@ void InstanceList::publish(InstanceList& rebuilt) {
     m_held.swap(taken);
     getStlList().swap(elements);
     outdated.swap(m_cached);
+}
+
+InstanceList::Iterator joinInstances(std::vector<InstanceList::Iterator> parts) {
+    const auto kept = std::make_shared<std::vector<InstanceList::Iterator>>(std::move(parts));
+    auto joined = std::make_shared<InstanceList::Snapshot>();
+    for (InstanceList::Iterator& part : *kept) {
+        for (CimInstance* each = part.first(); each != nullptr; each = part.next()) {
+            // Shares the ownership of the enumerations, which keep their elements.
+            joined->emplace_back(kept, each);
+        }
+    }
+    return InstanceList::Iterator(std::make_unique<SnapshotIterator>(std::move(joined)));
 }
 
 }  // namespace core

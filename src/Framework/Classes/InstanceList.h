@@ -48,6 +48,11 @@ class QUENX_EXPORT InstanceList : public utils::SafeList<CimInstance*>,
     SharedSnapshot m_cached QUENX_GUARDED_BY(getMutex());
 };
 
+/// Several enumerations as one, in their order; none of them gives an empty one. It keeps the elements of
+/// all.
+QUENX_EXPORT utils::SafeList<CimInstance*>::Iterator joinInstances(
+    std::vector<utils::SafeList<CimInstance*>::Iterator> parts);
+
 /// Lets a for loop walk an enumeration: `for (CimInstance* each : InstanceRange(broker->getInstances(...)))`.
 /// Holds the enumeration's elements while it lives; can be walked again when a walk has ended.
 class InstanceRange {

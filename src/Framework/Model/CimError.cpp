@@ -16,6 +16,7 @@ void rethrowAsCimError() {
     } catch (const CimError&) {
         throw;
     } catch (const std::bad_alloc&) {
+        // The front answers it in a few fixed words.
         throw;
     } catch (const std::exception& failure) {
         throw CimError(CimStatus::Failed, failure.what());

@@ -2,10 +2,66 @@
 #include "Framework/Model/CimInstance.h"
 
 #include <algorithm>
+#include <iterator>
+#include <set>
+#include <unordered_map>
 
+#include "Framework/Model/CimClassInfo.h"
 #include "Framework/Model/CimError.h"
+#include "Framework/Model/CimPropertyList.h"
+#include "Framework/Model/CimValue.h"
+#include "Utils/Os/Linux/Mutex.h"
 
 namespace core {
+
+namespace {
+
+thread_local DeclarationRecorder* currentRecorder = nullptr;
+
+/// What a shape depends on, as one text. Neither the class nor its name would do: two classes may add
+/// properties of their own to one binding. Addresses would not do either, which another library may reuse
+/// after an unload.
+std::string signatureOf(const std::vector<CimProperty*>& properties) {
+    std::string signature;
+    signature.reserve(properties.size() * 24);
+    for (const CimProperty* property : properties) {
+        signature += property->getName();
+        signature += property->isKey() ? '!' : ';';
+    }
+    return signature;
+}
+
+}  // namespace
+
+/// Which of the registered properties are served, as indices in the order of declaration: of every name the
+/// last one, since that is the most derived.
+struct CimInstance::Shape {
+    explicit Shape(const std::vector<CimProperty*>& properties) {
+        std::set<std::string> seen;
+        for (std::size_t i = properties.size(); i-- > 0;) {
+            if (seen.insert(foldName(properties[i]->getName())).second) served.push_back(i);
+        }
+        std::reverse(served.begin(), served.end());
+        std::copy_if(served.begin(), served.end(), std::back_inserter(keys),
+                     [&](std::size_t i) { return properties[i]->isKey(); });
+    }
+
+    std::vector<std::size_t> served;
+    std::vector<std::size_t> keys;  ///< those of the served ones that are keys
+};
+
+/// Found once for all instances whose properties have the same names and keys in the same order: a machine
+/// may have thousands of ports.
+std::shared_ptr<const CimInstance::Shape> CimInstance::findShape(
+    const std::vector<CimProperty*>& properties) {
+    static utils::Mutex mutex;
+    static std::unordered_map<std::string, std::shared_ptr<const Shape>> shapes;
+    const std::string signature = signatureOf(properties);
+    const utils::Mutex::AutoLocker lock(mutex);
+    auto& shape = shapes[signature];
+    if (shape == nullptr) shape = std::make_shared<const Shape>(properties);
+    return shape;
+}
 
 CimInstance::CimInstance() = default;
 
@@ -41,6 +97,7 @@ unsigned int CimInstance::modifyInstance(CimPropertyList& requested) {
     return 0;
 }
 
+// Found by name at each call: a method takes milliseconds, and instances have three at most.
 unsigned int CimInstance::invokeMethod(std::string name, CimPropertyList& in, CimPropertyList& out,
                                        CimInstance*& result) {
     const auto method = std::find_if(m_methods.begin(), m_methods.end(),
@@ -57,19 +114,21 @@ void CimInstance::registerMethod(std::string name, Method method) {
 }
 
 void CimInstance::setDeleted(bool deleted) {
+    // Marked before it leaves the list: iterators that hold an older snapshot pass it over from here on.
     if (!deleted || m_deleted.exchange(true, std::memory_order_acq_rel)) return;
     if (const auto list = m_list.lock()) list->remove(this);
 }
 
 CimProperty* CimInstance::getPropertyByName(std::string_view name) const {
+    // From the end, where the most derived class has registered its properties.
     const auto found =
         std::find_if(m_properties.rbegin(), m_properties.rend(),
                      [&](const CimProperty* property) { return sameName(property->getName(), name); });
     return found == m_properties.rend() ? nullptr : *found;
 }
 
-const PropertyShape& CimInstance::shape() const {
-    if (m_shape == nullptr) m_shape = shapeOf(m_properties);
+const CimInstance::Shape& CimInstance::shape() const {
+    if (m_shape == nullptr) m_shape = findShape(m_properties);
     return *m_shape;
 }
 
@@ -88,6 +147,7 @@ std::vector<CimProperty*> CimInstance::getProperties() const {
 
 std::shared_ptr<const CimPath> CimInstance::getPath() const {
     const RecursiveLocker lock(m_mutex);
+    // Shared, since thousands of associations may refer to one instance.
     if (m_path == nullptr) m_path = std::make_shared<const CimPath>(CimPath::of(*this));
     return m_path;
 }
@@ -106,6 +166,7 @@ void CimInstance::registerProperty(CimProperty* property) {
     const RecursiveLocker lock(m_mutex);
     if (m_properties.empty()) m_properties.reserve(8);  // as many as most associations have
     m_properties.push_back(property);
+    // A base class's constructor may have looked at the shape already.
     m_shape.reset();
 }
 
@@ -116,8 +177,42 @@ void CimInstance::unregisterProperty(CimProperty* property) noexcept {
 }
 
 void CimInstance::declareClass(const CimClassInfo& info) {
+    // Bases come first, so the last call is that of the most derived class.
     m_classInfo = &info;
-    recordDeclaration(info, m_properties.size());
+    if (currentRecorder != nullptr) currentRecorder->marks.emplace_back(&info, m_properties.size());
+}
+
+DeclarationRecorder::DeclarationRecorder() : m_outer(currentRecorder) {
+    currentRecorder = this;
+}
+
+DeclarationRecorder::~DeclarationRecorder() {
+    currentRecorder = m_outer;
+}
+
+CimPath CimPath::of(const CimInstance& instance) {
+    CimPath path(instance.getCreationClassName(), {});
+    const RecursiveLocker lock(instance.getMutex());
+    for (const CimProperty* property : instance.getKeys()) {
+        const CimValue value = property->getValue();
+        // A null key is written as an empty text: a path has to name every key of its class (DSP0004 8.2).
+        path.m_keys.push_back(
+            {property->getName(), value.scalar() ? *value.scalar() : CimScalar(std::string())});
+    }
+    return path;
+}
+
+bool CimPath::isSameObjectAs(const CimInstance& instance) const {
+    if (!isValid() || !sameName(m_className, instance.getCreationClassName())) return false;
+    const RecursiveLocker lock(instance.getMutex());
+    const std::vector<CimProperty*> properties = instance.getKeys();
+    if (properties.size() != m_keys.size()) return false;
+    return std::all_of(properties.begin(), properties.end(), [&](const CimProperty* property) {
+        const CimKey* key = findByName(m_keys, property->getName());
+        if (key == nullptr) return false;
+        const CimValue value = property->getValue();
+        return value.scalar() != nullptr && sameValue(key->value, *value.scalar());
+    });
 }
 
 }  // namespace core

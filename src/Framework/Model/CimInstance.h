@@ -2,22 +2,46 @@
 #pragma once
 
 #include <atomic>
-#include <map>
+#include <cstddef>
 #include <memory>
+#include <mutex>
 #include <string>
 #include <string_view>
+#include <utility>
 #include <vector>
 
-#include "Framework/Model/CimClassInfo.h"
-#include "Framework/Model/CimPropertyList.h"
-#include "Framework/Model/PropertyShape.h"
-#include "Framework/Model/RecursiveMutex.h"
 #include "Utils/Export.h"
+#include "Utils/Os/Linux/Mutex.h"
 
 namespace core {
 
 class CimInstance;
+class CimPath;
 class CimProperty;
+class CimPropertyList;
+struct CimClassInfo;
+
+/// A mutex that its holder may lock again; annotated, so that Clang checks what it guards.
+class QUENX_CAPABILITY("mutex") RecursiveMutex {
+  public:
+    void lock() QUENX_ACQUIRE() { m_mutex.lock(); }
+    void unlock() QUENX_RELEASE() { m_mutex.unlock(); }
+
+  private:
+    std::recursive_mutex m_mutex;
+};
+
+/// Holds a RecursiveMutex for a scope.
+class QUENX_SCOPED_CAPABILITY RecursiveLocker {
+  public:
+    explicit RecursiveLocker(RecursiveMutex& mutex) QUENX_ACQUIRE(mutex) : m_mutex(mutex) { m_mutex.lock(); }
+    ~RecursiveLocker() QUENX_RELEASE() { m_mutex.unlock(); }
+    RecursiveLocker(const RecursiveLocker&) = delete;
+    RecursiveLocker& operator=(const RecursiveLocker&) = delete;
+
+  private:
+    RecursiveMutex& m_mutex;
+};
 
 /// The way from an instance back to the list that serves it; outlives both.
 class InstanceListLink {
@@ -32,7 +56,7 @@ class InstanceListLink {
 /// Owns no properties: they are members of the derived classes and register themselves here. Several
 /// registered properties may share a name, one per class of the chain that declares it; the one served is the
 /// most derived.
-class QUENX_EXPORT CimInstance : public std::enable_shared_from_this<CimInstance> {
+class QUENX_EXPORT CimInstance {
   public:
     /// A provider method: input arguments, output arguments, an instance handed back (such as a created job);
     /// returns the method's CIM return value. The instance handed back stays owned by its class object's
@@ -73,8 +97,6 @@ class QUENX_EXPORT CimInstance : public std::enable_shared_from_this<CimInstance
     const std::vector<CimProperty*>& getAllProperties() const { return m_properties; }
     /// CimPath::of() this instance, found once and shared until a key changes.
     std::shared_ptr<const CimPath> getPath() const;
-    /// The most derived class that has said what it is; null when none has.
-    const CimClassInfo* getClassInfo() const { return m_classInfo; }
 
     /// Guards the values of all properties. A refresh holds it from beginning to end, a front while it copies
     /// the values, so that nobody sees half a refresh. Never hold the locks of two instances.
@@ -97,12 +119,14 @@ class QUENX_EXPORT CimInstance : public std::enable_shared_from_this<CimInstance
     void setDestructionWaits() { m_destructionWaits = true; }
 
   private:
+    struct Shape;
     friend class CimProperty;
     friend class InstanceList;
     friend class InstanceReaper;
     friend struct InstanceRelease;
 
-    const PropertyShape& shape() const QUENX_REQUIRES(m_mutex);
+    static std::shared_ptr<const Shape> findShape(const std::vector<CimProperty*>& properties);
+    const Shape& shape() const QUENX_REQUIRES(m_mutex);
     std::vector<CimProperty*> select(const std::vector<std::size_t>& indices) const;
     void registerMethod(std::string name, Method method);
     void registerProperty(CimProperty* property);
@@ -112,16 +136,31 @@ class QUENX_EXPORT CimInstance : public std::enable_shared_from_this<CimInstance
 
     mutable RecursiveMutex m_mutex;
     std::vector<CimProperty*> m_properties;
-    mutable std::shared_ptr<const PropertyShape> m_shape
-        QUENX_GUARDED_BY(m_mutex);  ///< found at the first use
+    // Both found at the first use.
+    mutable std::shared_ptr<const Shape> m_shape QUENX_GUARDED_BY(m_mutex);
     mutable std::shared_ptr<const CimPath> m_path QUENX_GUARDED_BY(m_mutex);
     std::vector<std::pair<std::string, Method>> m_methods;
     const CimClassInfo* m_classInfo = nullptr;
     std::weak_ptr<InstanceListLink> m_list;  ///< set once, when the instance is added
-    CimInstance* m_nextToDestroy =
-        nullptr;  ///< links the queue of instances to destroy, without an allocation
+    CimInstance* m_nextToDestroy = nullptr;  ///< links the queue of instances to destroy
     bool m_destructionWaits = false;
     std::atomic<bool> m_deleted{false};
+};
+
+/// Learns which class of a chain has declared which properties: it collects what the constructors of the
+/// instances that are built on this thread say to CimInstance::declareClass() while it lives.
+class DeclarationRecorder {
+  public:
+    DeclarationRecorder();
+    ~DeclarationRecorder();
+    DeclarationRecorder(const DeclarationRecorder&) = delete;
+    DeclarationRecorder& operator=(const DeclarationRecorder&) = delete;
+
+    /// Each class, and how many properties the instance had when its constructor ended.
+    std::vector<std::pair<const CimClassInfo*, std::size_t>> marks;
+
+  private:
+    DeclarationRecorder* m_outer;
 };
 
 }  // namespace core

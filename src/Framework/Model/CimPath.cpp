@@ -1,10 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "Framework/Model/CimPath.h"
-
+// Object paths: their text form, and when two name the same object.
 #include <algorithm>
 #include <set>
 
-#include "Framework/Model/CimInstance.h"
 #include "Framework/Model/CimValue.h"
 #include "Utils/Utils.h"
 
@@ -12,28 +10,22 @@ namespace core {
 
 namespace {
 
+/// Bytes beyond ASCII belong to UTF-8, whose letters DSP0004 allows in names.
 bool isNameStart(char c) {
-    return utils::isLetter(c) || c == '_';
-}
-
-bool isNameCharacter(char c) {
-    return isNameStart(c) || utils::isDigit(c) || (c & 0x80) != 0;
+    return utils::isLetter(c) || c == '_' || (c & 0x80) != 0;
 }
 
 bool isName(std::string_view text) {
-    return !text.empty() && (isNameStart(text.front()) || (text.front() & 0x80) != 0) &&
-           std::all_of(text.begin(), text.end(), isNameCharacter);
-}
-
-bool isQuotedType(const CimScalar& value) {
-    return std::holds_alternative<std::string>(value) || std::holds_alternative<CimPath>(value) ||
-           std::holds_alternative<utils::Time>(value);
+    return !text.empty() && isNameStart(text.front()) &&
+           std::all_of(text.begin(), text.end(), [](char c) { return isNameStart(c) || utils::isDigit(c); });
 }
 
 std::string keyText(const CimScalar& value) {
-    // The type is only looked at for how a number was declared, which its variant tells as well.
     const std::string text = scalarText(CimType::String, value);
-    return isQuotedType(value) ? utils::quoted(text) : text;
+    const bool isQuoted = std::holds_alternative<std::string>(value) ||
+                          std::holds_alternative<CimPath>(value) ||
+                          std::holds_alternative<utils::Time>(value);
+    return isQuoted ? utils::quoted(text) : text;
 }
 
 /// Reads the list of keys behind the class name.
@@ -43,7 +35,8 @@ class KeyReader {
 
     std::optional<std::vector<CimKey>> read() {
         std::vector<CimKey> keys;
-        std::set<std::string> seen;  // a client may send thousands of keys
+        // A set, since a client may send thousands of keys.
+        std::set<std::string> seen;
         do {
             auto key = readKey();
             if (!key || !seen.insert(foldName(key->name)).second) return std::nullopt;
@@ -85,6 +78,8 @@ class KeyReader {
         const std::string_view text = m_rest.substr(0, m_rest.find(','));
         m_rest.remove_prefix(text.size());
         if (text.empty()) return std::nullopt;
+        // Nothing else tells how the number was declared; the first type that takes the text is the one that
+        // writes it the same way again.
         for (const CimType type : {CimType::Uint64, CimType::Sint64, CimType::Boolean, CimType::Real64}) {
             if (auto value = parseScalar(type, text)) return value;
         }
@@ -95,13 +90,6 @@ class KeyReader {
 };
 
 }  // namespace
-
-CimPath::CimPath() = default;
-CimPath::CimPath(const CimPath&) = default;
-CimPath::CimPath(CimPath&&) noexcept = default;
-CimPath& CimPath::operator=(const CimPath&) = default;
-CimPath& CimPath::operator=(CimPath&&) noexcept = default;
-CimPath::~CimPath() = default;
 
 CimPath::CimPath(std::string text) {
     if (parse(text)) return;
@@ -136,17 +124,6 @@ bool CimPath::parse(std::string_view text) {
     if (!keys) return false;
     m_keys = std::move(*keys);
     return true;
-}
-
-CimPath CimPath::of(const CimInstance& instance) {
-    CimPath path(instance.getCreationClassName(), {});
-    const RecursiveLocker lock(instance.getMutex());
-    for (const CimProperty* property : instance.getKeys()) {
-        const CimValue value = property->getValue();
-        path.m_keys.push_back(
-            {property->getName(), value.scalar() ? *value.scalar() : CimScalar(std::string())});
-    }
-    return path;
 }
 
 std::string CimPath::toString() const {
@@ -185,25 +162,8 @@ bool CimPath::isSameObjectAs(const CimPath& other) const {
     if (!m_namespace.empty() && !other.m_namespace.empty() && !sameName(m_namespace, other.m_namespace))
         return false;
     return std::all_of(m_keys.begin(), m_keys.end(), [&](const CimKey& key) {
-        const auto match =
-            std::find_if(other.m_keys.begin(), other.m_keys.end(),
-                         [&](const CimKey& candidate) { return sameName(candidate.name, key.name); });
-        return match != other.m_keys.end() && sameValue(key.value, match->value);
-    });
-}
-
-bool CimPath::isSameObjectAs(const CimInstance& instance) const {
-    if (!isValid() || !sameName(m_className, instance.getCreationClassName())) return false;
-    const RecursiveLocker lock(instance.getMutex());
-    const std::vector<CimProperty*> properties = instance.getKeys();
-    if (properties.size() != m_keys.size()) return false;
-    return std::all_of(properties.begin(), properties.end(), [&](const CimProperty* property) {
-        const auto key = std::find_if(m_keys.begin(), m_keys.end(), [&](const CimKey& candidate) {
-            return sameName(candidate.name, property->getName());
-        });
-        if (key == m_keys.end()) return false;
-        const CimValue value = property->getValue();
-        return value.scalar() != nullptr && sameValue(key->value, *value.scalar());
+        const CimKey* match = findByName(other.m_keys, key.name);
+        return match != nullptr && sameValue(key.value, match->value);
     });
 }
 

@@ -1,16 +1,22 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include <cstddef>
 #include <cstdint>
+#include <limits>
+#include <memory>
 #include <string>
+#include <vector>
 
 #include "Framework/Model/CimType.h"
-#include "Framework/Model/CimValue.h"
 #include "Utils/Export.h"
+#include "Utils/Time.h"
 
 namespace core {
 
 class CimInstance;
+class CimPath;
+struct CimValue;
 
 /// One property of an instance, or one argument of a method call.
 ///
@@ -100,5 +106,130 @@ class QUENX_EXPORT CimProperty {
     CimInstance* m_owner;
     Listener* m_listeners = nullptr;
 };
+
+/// A property with one value of type T. Starts null; assignment ends the null state.
+template <class T, CimType Type>
+class CimPropertyScalar : public CimProperty {
+  public:
+    CimPropertyScalar(const char* name, CimInstance* owner);
+
+    CimPropertyScalar& operator=(T value);
+    /// T() when null, an interval of 0 for a datetime.
+    T get() const;
+
+  protected:
+    void load(CimValue& value) const override;
+    void store(const CimValue& value) override;
+
+  private:
+    T m_value;
+};
+
+/// A property with an array of T. Starts null; push_back and assignment end the null state, clear leaves an
+/// empty array.
+template <class T, CimType Type>
+class CimPropertyArray : public CimProperty {
+  public:
+    CimPropertyArray(const char* name, CimInstance* owner);
+
+    void push_back(T value);
+    void clear();
+    CimPropertyArray& operator=(std::vector<T> values);
+    /// Empty when null.
+    std::vector<T> get() const;
+
+  protected:
+    void load(CimValue& value) const override;
+    void store(const CimValue& value) override;
+
+  private:
+    std::vector<T> m_values;
+};
+
+/// A text property, with a check of its length on requested values, which lets every length pass: a class
+/// that wants bounds adds listeners of its own.
+class QUENX_EXPORT CimPropertyString : public CimProperty {
+  public:
+    /// Refuses a requested text that is longer than the bound (in bytes).
+    class QUENX_EXPORT CheckMaxLengthListener : public Listener {
+      public:
+        explicit CheckMaxLengthListener(std::size_t bound) : m_bound(bound) {}
+        void onPropertyModify(CimProperty* current, CimProperty* requested) override;
+        void onPropertyVerify(CimProperty* current, CimProperty* requested) override;
+
+      private:
+        const std::size_t m_bound;
+    };
+    /// Refuses a requested text that is shorter than the bound (in bytes).
+    class QUENX_EXPORT CheckMinLengthListener : public Listener {
+      public:
+        explicit CheckMinLengthListener(std::size_t bound) : m_bound(bound) {}
+        void onPropertyModify(CimProperty* current, CimProperty* requested) override;
+        void onPropertyVerify(CimProperty* current, CimProperty* requested) override;
+
+      private:
+        const std::size_t m_bound;
+    };
+
+    CimPropertyString(const char* name, CimInstance* owner);
+
+    CimPropertyString& operator=(std::string value);
+    /// Copies the value, or the null state. The other is copied first, so two instances are never locked at
+    /// once.
+    CimPropertyString& operator=(const CimPropertyString& other);
+    /// Empty when null.
+    std::string get() const;
+
+  protected:
+    void load(CimValue& value) const override;
+    void store(const CimValue& value) override;
+
+  private:
+    std::string m_value;
+    CheckMaxLengthListener m_maxLength{std::numeric_limits<std::size_t>::max()};
+    CheckMinLengthListener m_minLength{0};
+};
+
+/// A reference to another instance; its text is the target's path. It keeps that path, taken when it was set,
+/// so it can be served after the target has gone; the target itself is not kept alive, since it may belong to
+/// a library that unloads first.
+class QUENX_EXPORT CimPropertyRef : public CimProperty {
+  public:
+    CimPropertyRef(const char* name, CimInstance* owner);
+
+    /// The target's path; one that names nothing when null.
+    CimPath getPath() const;
+
+  protected:
+    /// Takes the instance's path. A null pointer makes the property null.
+    void assign(const CimInstance* target);
+
+    void load(CimValue& value) const override;
+    void store(const CimValue& value) override;
+
+  private:
+    std::shared_ptr<const CimPath> m_path;
+};
+
+using CimPropertyString_arr = CimPropertyArray<std::string, CimType::String>;
+using CimPropertyUint8 = CimPropertyScalar<unsigned char, CimType::Uint8>;
+using CimPropertySint8 = CimPropertyScalar<signed char, CimType::Sint8>;
+using CimPropertyUint16 = CimPropertyScalar<unsigned short, CimType::Uint16>;
+using CimPropertyUint16_arr = CimPropertyArray<unsigned short, CimType::Uint16>;
+using CimPropertyUint32 = CimPropertyScalar<unsigned int, CimType::Uint32>;
+using CimPropertyUint64 = CimPropertyScalar<std::uint64_t, CimType::Uint64>;
+using CimPropertyBoolean = CimPropertyScalar<bool, CimType::Boolean>;
+using CimPropertyDatetime = CimPropertyScalar<utils::Time, CimType::Datetime>;
+
+// The templates that cross libraries have their one copy, with vtable and type information, in the framework.
+extern template class QUENX_EXPORT CimPropertyArray<std::string, CimType::String>;
+extern template class QUENX_EXPORT CimPropertyArray<unsigned short, CimType::Uint16>;
+extern template class QUENX_EXPORT CimPropertyScalar<unsigned char, CimType::Uint8>;
+extern template class QUENX_EXPORT CimPropertyScalar<signed char, CimType::Sint8>;
+extern template class QUENX_EXPORT CimPropertyScalar<unsigned short, CimType::Uint16>;
+extern template class QUENX_EXPORT CimPropertyScalar<unsigned int, CimType::Uint32>;
+extern template class QUENX_EXPORT CimPropertyScalar<std::uint64_t, CimType::Uint64>;
+extern template class QUENX_EXPORT CimPropertyScalar<bool, CimType::Boolean>;
+extern template class QUENX_EXPORT CimPropertyScalar<utils::Time, CimType::Datetime>;
 
 }  // namespace core

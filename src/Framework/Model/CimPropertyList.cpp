@@ -1,80 +1,64 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Framework/Model/CimPropertyList.h"
 
+#include <algorithm>
+#include <iterator>
+
 #include "Framework/Model/CimError.h"
-#include "Framework/Model/CimProperties.h"
-#include "Framework/Model/CimPropertyRef.h"
+#include "Framework/Model/CimValue.h"
 
 namespace core {
 
 namespace {
 
-std::unique_ptr<CimProperty> makeArray(const char* name, CimType type) {
-    switch (type) {
-        case CimType::String:
-            return std::make_unique<CimPropertyString_arr>(name, nullptr);
-        case CimType::Uint16:
-            return std::make_unique<CimPropertyUint16_arr>(name, nullptr);
-        default:
-            return nullptr;
-    }
+template <class Property>
+std::unique_ptr<CimProperty> make(const char* name) {
+    return std::make_unique<Property>(name, nullptr);
 }
 
-std::unique_ptr<CimProperty> makeScalar(const char* name, CimType type) {
-    switch (type) {
-        case CimType::String:
-            return std::make_unique<CimPropertyString>(name, nullptr);
-        case CimType::Uint8:
-            return std::make_unique<CimPropertyUint8>(name, nullptr);
-        case CimType::Sint8:
-            return std::make_unique<CimPropertySint8>(name, nullptr);
-        case CimType::Uint16:
-            return std::make_unique<CimPropertyUint16>(name, nullptr);
-        case CimType::Uint32:
-            return std::make_unique<CimPropertyUint32>(name, nullptr);
-        case CimType::Uint64:
-            return std::make_unique<CimPropertyUint64>(name, nullptr);
-        case CimType::Boolean:
-            return std::make_unique<CimPropertyBoolean>(name, nullptr);
-        case CimType::Datetime:
-            return std::make_unique<CimPropertyDatetime>(name, nullptr);
-        case CimType::Reference:
-            return std::make_unique<CimPropertyRef>(name, nullptr);
-        default:
-            return nullptr;
-    }
-}
+/// The kinds of properties, by the values that they hold.
+struct Kind {
+    CimType type;
+    bool isArray;
+    std::unique_ptr<CimProperty> (*make)(const char* name);
+};
+constexpr Kind kKinds[] = {
+    {CimType::String, false, make<CimPropertyString>},
+    {CimType::String, true, make<CimPropertyString_arr>},
+    {CimType::Uint8, false, make<CimPropertyUint8>},
+    {CimType::Sint8, false, make<CimPropertySint8>},
+    {CimType::Uint16, false, make<CimPropertyUint16>},
+    {CimType::Uint16, true, make<CimPropertyUint16_arr>},
+    {CimType::Uint32, false, make<CimPropertyUint32>},
+    {CimType::Uint64, false, make<CimPropertyUint64>},
+    {CimType::Boolean, false, make<CimPropertyBoolean>},
+    {CimType::Datetime, false, make<CimPropertyDatetime>},
+    {CimType::Reference, false, make<CimPropertyRef>},
+};
 
 }  // namespace
 
-CimPropertyList::CimPropertyList() = default;
-CimPropertyList::CimPropertyList(CimPropertyList&&) noexcept = default;
-CimPropertyList& CimPropertyList::operator=(CimPropertyList&&) noexcept = default;
-CimPropertyList::~CimPropertyList() = default;
-
 CimProperty* CimPropertyList::getPropertyByName(std::string name) const {
+    // A call has a handful of arguments.
     for (const auto& property : m_properties) {
         if (sameName(property->getName(), name)) return property.get();
     }
     return nullptr;
 }
 
-void CimPropertyList::add(std::unique_ptr<CimProperty> property) {
-    m_properties.push_back(std::move(property));
-}
-
 CimProperty& CimPropertyList::add(const std::string& name, const CimValue& value) {
-    m_names.push_back(std::make_unique<std::string>(name));
-    const char* kept = m_names.back()->c_str();
-    auto property = value.isArray ? makeArray(kept, value.type) : makeScalar(kept, value.type);
-    if (property == nullptr) {
+    const auto kind = std::find_if(std::begin(kKinds), std::end(kKinds), [&](const Kind& each) {
+        return each.type == value.type && each.isArray == value.isArray;
+    });
+    if (kind == std::end(kKinds)) {
         throw CimError(CimStatus::InvalidParameter, name + ": no property holds values of type " +
                                                         std::string(typeName(value.type)) +
                                                         (value.isArray ? "[]" : ""));
     }
+    // Methods cast arguments to the kinds that they declare, so a null has to have its kind, too.
+    auto property = kind->make(m_names.emplace_back(name).c_str());
     property->setValue(value);
-    add(std::move(property));
-    return *m_properties.back();
+    return *m_properties.emplace_back(std::move(property));
 }
 
 }  // namespace core

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include <list>
 #include <memory>
 #include <string>
 #include <vector>
@@ -13,15 +14,9 @@ namespace core {
 /// thread.
 class QUENX_EXPORT CimPropertyList {
   public:
-    CimPropertyList();
-    CimPropertyList(CimPropertyList&&) noexcept;
-    CimPropertyList& operator=(CimPropertyList&&) noexcept;
-    ~CimPropertyList();
-
     /// The property of that name (compared without regard to case), or null when it was not passed.
     CimProperty* getPropertyByName(std::string name) const;
 
-    void add(std::unique_ptr<CimProperty> property);
     const std::vector<std::unique_ptr<CimProperty>>& getProperties() const { return m_properties; }
 
     /// A property of the kind that the type asks for, holding the value. The list keeps the name.
@@ -29,8 +24,8 @@ class QUENX_EXPORT CimPropertyList {
     CimProperty& add(const std::string& name, const CimValue& value);
 
   private:
-    // Properties keep pointers to their names.
-    std::vector<std::unique_ptr<std::string>> m_names;
+    // A list, since properties keep pointers to their names.
+    std::list<std::string> m_names;
     std::vector<std::unique_ptr<CimProperty>> m_properties;
 };
 

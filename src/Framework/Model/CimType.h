@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include <algorithm>
 #include <optional>
 #include <string>
 #include <string_view>
@@ -44,5 +45,13 @@ QUENX_EXPORT bool sameName(std::string_view left, std::string_view right);
 
 /// The name folded to one case, for use as a key in a map.
 QUENX_EXPORT std::string foldName(std::string_view name);
+
+/// The first element whose member `name` is that name, compared likewise; null when there is none.
+template <class Elements>
+auto* findByName(Elements& elements, std::string_view name) {
+    const auto found = std::find_if(elements.begin(), elements.end(),
+                                    [&](const auto& element) { return sameName(element.name, name); });
+    return found == elements.end() ? nullptr : &*found;
+}
 
 }  // namespace core

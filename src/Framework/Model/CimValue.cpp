@@ -2,69 +2,55 @@
 #include "Framework/Model/CimValue.h"
 
 #include <algorithm>
+#include <array>
 #include <charconv>
+#include <chrono>
 #include <cmath>
-#include <limits>
+#include <cstdio>
+#include <utility>
+
+#include "Utils/Utils.h"
 
 namespace core {
 
 namespace {
 
-std::string_view withoutBlanks(std::string_view text) {
-    const auto first = text.find_first_not_of(" \t\r\n");
-    if (first == std::string_view::npos) return {};
-    return text.substr(first, text.find_last_not_of(" \t\r\n") - first + 1);
-}
+constexpr std::size_t kDatetimeLength = 25;
+constexpr int kMostDays = 99999999;
 
-std::uint32_t bitsOf(CimType type) {
-    switch (type) {
-        case CimType::Uint8:
-        case CimType::Sint8:
-            return 8;
-        case CimType::Uint16:
-        case CimType::Sint16:
-            return 16;
-        case CimType::Uint32:
-        case CimType::Sint32:
-            return 32;
-        default:
-            return 64;
-    }
-}
-
-bool fits(CimType type, std::uint64_t value) {
-    const std::uint32_t bits = bitsOf(type);
-    return bits == 64 || value < (std::uint64_t{1} << bits);
-}
-
-bool fits(CimType type, std::int64_t value) {
-    const std::uint32_t bits = bitsOf(type);
-    if (bits == 64) return true;
+/// Whether an integer type has room for the value.
+template <class T>
+bool fits(CimType type, T value) {
+    const CimType narrowest = isUnsigned(type) ? CimType::Uint8 : CimType::Sint8;
+    const int bits = 8 << (static_cast<int>(type) - static_cast<int>(narrowest));
+    if (bits == 64)
+        return isUnsigned(type) ? std::in_range<std::uint64_t>(value) : std::in_range<std::int64_t>(value);
+    if (isUnsigned(type))
+        return std::cmp_greater_equal(value, 0) && std::cmp_less(value, std::uint64_t{1} << bits);
     const std::int64_t bound = std::int64_t{1} << (bits - 1);
-    return value >= -bound && value < bound;
+    return std::cmp_greater_equal(value, -bound) && std::cmp_less(value, bound);
 }
 
 /// A whole number with an optional sign, decimal or hexadecimal.
 template <class T>
-std::optional<T> parseInteger(std::string_view text) {
-    text = withoutBlanks(text);
-    if (!text.empty() && text.front() == '+') text.remove_prefix(1);
+std::optional<CimScalar> parseInteger(CimType type, std::string_view text) {
+    if (text.starts_with('+')) text.remove_prefix(1);
     int base = 10;
-    const bool negative = !text.empty() && text.front() == '-';
-    if (std::string_view digits = text.substr(negative ? 1 : 0);
-        digits.size() > 2 && digits[0] == '0' && (digits[1] == 'x' || digits[1] == 'X')) {
-        if (negative) return std::nullopt;
+    const bool isNegative = text.starts_with('-');
+    if (const std::string_view digits = text.substr(isNegative ? 1 : 0);
+        digits.size() > 2 && (digits.starts_with("0x") || digits.starts_with("0X"))) {
+        // DSP0004 knows no negative hexadecimal numbers.
+        if (isNegative) return std::nullopt;
         text = digits.substr(2);
         base = 16;
     }
     T value{};
     const auto [end, error] = std::from_chars(text.data(), text.data() + text.size(), value, base);
-    if (error != std::errc() || end != text.data() + text.size() || text.empty()) return std::nullopt;
-    return value;
+    if (error != std::errc() || end != text.data() + text.size() || !fits(type, value)) return std::nullopt;
+    return CimScalar(value);
 }
 
 std::optional<CimScalar> parseReal(std::string_view text) {
-    text = withoutBlanks(text);
     double value = 0;
     const auto [end, error] = std::from_chars(text.data(), text.data() + text.size(), value);
     if (error != std::errc() || end != text.data() + text.size()) return std::nullopt;
@@ -72,7 +58,6 @@ std::optional<CimScalar> parseReal(std::string_view text) {
 }
 
 std::optional<CimScalar> parseBoolean(std::string_view text) {
-    text = withoutBlanks(text);
     if (sameName(text, "true")) return CimScalar(true);
     if (sameName(text, "false")) return CimScalar(false);
     return std::nullopt;
@@ -88,15 +73,78 @@ std::string realText(double value) {
     return text.insert(std::min(text.find('e'), text.size()), ".0");
 }
 
-bool sameInteger(std::uint64_t left, std::int64_t right) {
-    return right >= 0 && left == static_cast<std::uint64_t>(right);
+/// Paths write texts, references and datetimes in quotes, so a text that was read from a path may stand for
+/// any of the three.
+struct SameValue {
+    bool operator()(std::uint64_t left, std::int64_t right) const { return std::cmp_equal(left, right); }
+    bool operator()(std::int64_t left, std::uint64_t right) const { return std::cmp_equal(left, right); }
+    bool operator()(double left, double right) const { return !(left < right) && !(left > right); }
+    bool operator()(const CimPath& left, const CimPath& right) const { return left.isSameObjectAs(right); }
+    bool operator()(const CimPath& left, const std::string& right) const {
+        return left.isSameObjectAs(CimPath(right));
+    }
+    bool operator()(const std::string& left, const CimPath& right) const { return (*this)(right, left); }
+    bool operator()(const utils::Time& left, const utils::Time& right) const {
+        return datetimeText(left) == datetimeText(right);
+    }
+    bool operator()(const utils::Time& left, const std::string& right) const {
+        return datetimeText(left) == right;
+    }
+    bool operator()(const std::string& left, const utils::Time& right) const { return (*this)(right, left); }
+    template <class T>
+    bool operator()(const T& left, const T& right) const {
+        return left == right;
+    }
+    template <class Left, class Right>
+    bool operator()(const Left&, const Right&) const {
+        return false;
+    }
+};
+
+/// The integer as the type holds it; nothing for another value, or one that is too large.
+template <class Held>
+std::optional<CimScalar> convertInteger(CimType type, const CimScalar& value) {
+    const auto held = [&](auto number) -> std::optional<CimScalar> {
+        if (!fits(type, number)) return std::nullopt;
+        return CimScalar(static_cast<Held>(number));
+    };
+    if (const auto* number = std::get_if<std::uint64_t>(&value)) return held(*number);
+    if (const auto* number = std::get_if<std::int64_t>(&value)) return held(*number);
+    return std::nullopt;
 }
 
-/// A text against a value of a type that paths write in quotes.
-bool sameQuoted(const std::string& text, const CimScalar& other) {
-    if (const auto* path = std::get_if<CimPath>(&other)) return path->isSameObjectAs(CimPath(text));
-    if (const auto* time = std::get_if<utils::Time>(&other)) return datetimeText(*time) == text;
-    return false;
+/// The digits at a place of the text as a number; nothing when one is no digit.
+std::optional<int> digits(std::string_view text, std::size_t place, std::size_t count) {
+    const std::string_view field = text.substr(place, count);
+    if (!std::all_of(field.begin(), field.end(), utils::isDigit)) return std::nullopt;
+    int value = 0;
+    std::from_chars(field.data(), field.data() + field.size(), value);
+    return value;
+}
+
+std::optional<utils::Time> parseInterval(std::string_view text, std::chrono::microseconds timeOfDay) {
+    const auto days = digits(text, 0, 8);
+    if (!days || !text.ends_with(":000")) return std::nullopt;
+    const std::chrono::microseconds length = std::chrono::days(*days) + timeOfDay;
+    return utils::Time(static_cast<unsigned long long>(length.count()));
+}
+
+std::optional<utils::Time> parseTimestamp(std::string_view text, std::chrono::microseconds timeOfDay) {
+    const auto year = digits(text, 0, 4);
+    const auto month = digits(text, 4, 2);
+    const auto day = digits(text, 6, 2);
+    const auto offset = digits(text, 22, 3);
+    if (!year || !month || !day || !offset || (text[21] != '+' && text[21] != '-')) return std::nullopt;
+    const std::chrono::year_month_day date(std::chrono::year(*year),
+                                           std::chrono::month(static_cast<unsigned>(*month)),
+                                           std::chrono::day(static_cast<unsigned>(*day)));
+    // 1969 is refused whole, although an offset could bring a time of its last day into 1970.
+    if (!date.ok() || *year < 1970) return std::nullopt;
+    const std::chrono::minutes east(text[21] == '+' ? *offset : -*offset);
+    const std::chrono::microseconds sinceEpoch =
+        std::chrono::sys_days(date).time_since_epoch() + timeOfDay - east;
+    if (sinceEpoch.count() < 0) return std::nullopt;
+    return utils::Time::fromEpoch(static_cast<unsigned long long>(sinceEpoch.count()));
 }
 
 }  // namespace
@@ -114,28 +162,7 @@ CimValue CimValue::arrayOf(CimType type, std::vector<CimScalar> values) {
 }
 
 bool sameValue(const CimScalar& left, const CimScalar& right) {
-    if (const auto* a = std::get_if<std::uint64_t>(&left)) {
-        if (const auto* b = std::get_if<std::int64_t>(&right)) return sameInteger(*a, *b);
-    }
-    if (const auto* a = std::get_if<std::int64_t>(&left)) {
-        if (const auto* b = std::get_if<std::uint64_t>(&right)) return sameInteger(*b, *a);
-    }
-    if (left.index() != right.index()) {
-        if (const auto* text = std::get_if<std::string>(&left)) return sameQuoted(*text, right);
-        if (const auto* text = std::get_if<std::string>(&right)) return sameQuoted(*text, left);
-        return false;
-    }
-    if (const auto* path = std::get_if<CimPath>(&left)) return path->isSameObjectAs(std::get<CimPath>(right));
-    if (const auto* time = std::get_if<utils::Time>(&left)) {
-        return datetimeText(*time) == datetimeText(std::get<utils::Time>(right));
-    }
-    if (const auto* real = std::get_if<double>(&left))
-        return !(*real < std::get<double>(right)) && !(*real > std::get<double>(right));
-    if (const auto* text = std::get_if<std::string>(&left)) return *text == std::get<std::string>(right);
-    if (const auto* flag = std::get_if<bool>(&left)) return *flag == std::get<bool>(right);
-    if (const auto* number = std::get_if<std::uint64_t>(&left))
-        return *number == std::get<std::uint64_t>(right);
-    return std::get<std::int64_t>(left) == std::get<std::int64_t>(right);
+    return std::visit(SameValue{}, left, right);
 }
 
 std::string scalarText(CimType type, const CimScalar& value) {
@@ -153,58 +180,69 @@ std::string scalarText(CimType type, const CimScalar& value) {
 }
 
 std::optional<CimScalar> parseScalar(CimType type, std::string_view text) {
-    if (isUnsigned(type)) {
-        const auto number = parseInteger<std::uint64_t>(text);
-        if (!number || !fits(type, *number)) return std::nullopt;
-        return CimScalar(*number);
-    }
-    if (isSigned(type)) {
-        const auto number = parseInteger<std::int64_t>(text);
-        if (!number || !fits(type, *number)) return std::nullopt;
-        return CimScalar(*number);
-    }
-    if (isReal(type)) return parseReal(text);
-    if (type == CimType::Boolean) return parseBoolean(text);
+    const std::string_view bare = utils::trimOf(text, " \t\r\n");
+    if (isUnsigned(type)) return parseInteger<std::uint64_t>(type, bare);
+    if (isSigned(type)) return parseInteger<std::int64_t>(type, bare);
+    if (isReal(type)) return parseReal(bare);
+    if (type == CimType::Boolean) return parseBoolean(bare);
     if (type == CimType::Datetime) {
         const auto time = parseDatetime(text);
-        if (!time) return std::nullopt;
-        return CimScalar(*time);
+        return time ? std::optional<CimScalar>(*time) : std::nullopt;
     }
     if (type == CimType::Reference) {
         CimPath path{std::string(text)};
-        if (!path.isValid()) return std::nullopt;
-        return CimScalar(std::move(path));
+        return path.isValid() ? std::optional<CimScalar>(std::move(path)) : std::nullopt;
     }
     return CimScalar(std::string(text));
 }
 
 std::optional<CimScalar> convertScalar(CimType type, const CimScalar& value) {
-    if (isUnsigned(type)) {
-        if (const auto* number = std::get_if<std::uint64_t>(&value); number && fits(type, *number))
-            return value;
-        if (const auto* number = std::get_if<std::int64_t>(&value);
-            number && *number >= 0 && fits(type, static_cast<std::uint64_t>(*number))) {
-            return CimScalar(static_cast<std::uint64_t>(*number));
-        }
-        return std::nullopt;
+    if (isUnsigned(type)) return convertInteger<std::uint64_t>(type, value);
+    if (isSigned(type)) return convertInteger<std::int64_t>(type, value);
+    const bool isHeldSo = isReal(type)                 ? std::holds_alternative<double>(value)
+                          : type == CimType::Boolean   ? std::holds_alternative<bool>(value)
+                          : type == CimType::Datetime  ? std::holds_alternative<utils::Time>(value)
+                          : type == CimType::Reference ? std::holds_alternative<CimPath>(value)
+                                                       : std::holds_alternative<std::string>(value);
+    if (isHeldSo) return value;
+    // Paths and clients write datetimes and references as texts; a number or a flag is never read from one.
+    const auto* text = std::get_if<std::string>(&value);
+    const bool isRead = type == CimType::Datetime || type == CimType::Reference;
+    return text != nullptr && isRead ? parseScalar(type, *text) : std::nullopt;
+}
+
+std::string datetimeText(utils::Time time) {
+    int year = 0;
+    int month = 0;
+    int day = 0;
+    int hour = 0;
+    int minute = 0;
+    int second = 0;
+    time.get(year, month, day, hour, minute, second);
+    const int milliseconds = static_cast<int>(time.getMiliseconds() % 1000);
+    std::array<char, 80> text{};
+    if (time.isPeriod()) {
+        std::snprintf(text.data(), text.size(), "%08d%02d%02d%02d.%03d000:000", std::min(day, kMostDays),
+                      hour, minute, second, milliseconds);
+    } else {
+        std::snprintf(text.data(), text.size(), "%04d%02d%02d%02d%02d%02d.%03d000+000", std::min(year, 9999),
+                      month, day, hour, minute, second, milliseconds);
     }
-    if (isSigned(type)) {
-        if (const auto* number = std::get_if<std::int64_t>(&value); number && fits(type, *number))
-            return value;
-        if (const auto* number = std::get_if<std::uint64_t>(&value);
-            number && *number <= static_cast<std::uint64_t>(std::numeric_limits<std::int64_t>::max()) &&
-            fits(type, static_cast<std::int64_t>(*number))) {
-            return CimScalar(static_cast<std::int64_t>(*number));
-        }
-        return std::nullopt;
-    }
-    if (isReal(type)) return std::holds_alternative<double>(value) ? std::optional(value) : std::nullopt;
-    if (type == CimType::Boolean)
-        return std::holds_alternative<bool>(value) ? std::optional(value) : std::nullopt;
-    if (const auto* text = std::get_if<std::string>(&value)) return parseScalar(type, *text);
-    if (type == CimType::Datetime && std::holds_alternative<utils::Time>(value)) return value;
-    if (type == CimType::Reference && std::holds_alternative<CimPath>(value)) return value;
-    return std::nullopt;
+    return {text.data(), std::min(kDatetimeLength, std::char_traits<char>::length(text.data()))};
+}
+
+std::optional<utils::Time> parseDatetime(std::string_view text) {
+    if (text.size() != kDatetimeLength || text[14] != '.') return std::nullopt;
+    const auto hour = digits(text, 8, 2);
+    const auto minute = digits(text, 10, 2);
+    const auto second = digits(text, 12, 2);
+    const auto fraction = digits(text, 15, 6);
+    if (!hour || !minute || !second || !fraction) return std::nullopt;
+    if (*hour > 23 || *minute > 59 || *second > 59) return std::nullopt;
+    const std::chrono::microseconds timeOfDay = std::chrono::hours(*hour) + std::chrono::minutes(*minute) +
+                                                std::chrono::seconds(*second) +
+                                                std::chrono::microseconds(*fraction);
+    return text[21] == ':' ? parseInterval(text, timeOfDay) : parseTimestamp(text, timeOfDay);
 }
 
 }  // namespace core

@@ -6,13 +6,36 @@
 #include <set>
 
 #include "Framework/Model/CimInstance.h"
-#include "Framework/Model/CimType.h"
-#include "Framework/Model/PropertyShape.h"
-#include "Utils/Os/Linux/Thread.h"
+#include "Framework/Model/CimProperty.h"
+#include "Utils/Os/Linux/Mutex.h"
 
 namespace core {
 
 namespace {
+
+using Scopes = std::vector<std::string_view>;
+
+std::vector<QualifierDeclaration> makeDeclarations() {
+    const CimValue no = CimValue::of(CimType::Boolean, false);
+    const CimValue yes = CimValue::of(CimType::Boolean, true);
+    const CimValue noText = CimValue::null(CimType::String);
+    const CimValue noTexts = CimValue::null(CimType::String, true);
+    const Scopes valued{"PROPERTY", "METHOD", "PARAMETER"};
+    // Scopes and flavors are those of the DMTF's qualifiers.mof, so that a client finds what it knows.
+    return {
+        {.name = "Association", .defaultValue = no, .scopes = {"ASSOCIATION"}, .isOverridable = false},
+        {.name = "Description", .defaultValue = noText, .scopes = qualifierScopes(), .isTranslatable = true},
+        {.name = "In", .defaultValue = yes, .scopes = {"PARAMETER"}, .isOverridable = false},
+        {.name = "Key", .defaultValue = no, .scopes = {"PROPERTY", "REFERENCE"}, .isOverridable = false},
+        {.name = "Out", .defaultValue = no, .scopes = {"PARAMETER"}, .isOverridable = false},
+        {.name = "Override",
+         .defaultValue = noText,
+         .scopes = {"PROPERTY", "REFERENCE", "METHOD"},
+         .isInherited = false},
+        {.name = "ValueMap", .defaultValue = noTexts, .scopes = valued},
+        {.name = "Values", .defaultValue = noTexts, .scopes = valued, .isTranslatable = true},
+    };
+}
 
 std::string referenceClassOf(const CimProperty& property) {
     const char* target = property.getReferenceClass();
@@ -59,6 +82,7 @@ PropertyDeclaration declare(CimProperty& property, bool isRepeated) {
 /// The properties that the class adds, read off an instance of it.
 std::vector<PropertyDeclaration> readProperties(const CimClassInfo& info) {
     if (info.makeSample == nullptr) return {};
+    // Nothing but a constructor knows which class of the chain brought which property.
     const DeclarationRecorder recorder;
     const auto sample = info.makeSample();
     const auto& all = sample->getAllProperties();
@@ -107,7 +131,7 @@ std::vector<Qualifier> valueMap(std::string_view text) {
 /// Adds the texts of the element, if the schema has any.
 void addTexts(std::vector<Qualifier>& qualifiers, const CimClassInfo& info, std::string_view element) {
     for (const CimElementText& text : info.texts) {
-        if (text.element != element) continue;
+        if (text.element != element) continue;  // a handful per class, and read once per process
         qualifiers.push_back(textQualifier("Description", text.description));
         for (Qualifier& one : valueMap(text.values))
             qualifiers.push_back(std::move(one));
@@ -143,6 +167,7 @@ class DeclarationCache {
   public:
     std::shared_ptr<const ClassDeclaration> find(const CimClassInfo& info) {
         const utils::Mutex::AutoLocker lock(m_mutex);
+        // Held while the sample is built, whose constructors need no declaration.
         auto& declaration = m_declarations[info.name];
         if (declaration == nullptr) declaration = read(info);
         return declaration;
@@ -154,6 +179,35 @@ class DeclarationCache {
 };
 
 }  // namespace
+
+const std::vector<std::string_view>& qualifierScopes() {
+    static const Scopes scopes{"CLASS",  "ASSOCIATION", "REFERENCE", "PROPERTY",
+                               "METHOD", "PARAMETER",   "INDICATION"};
+    return scopes;
+}
+
+const std::vector<QualifierDeclaration>& qualifierDeclarations() {
+    static const std::vector<QualifierDeclaration> declarations = makeDeclarations();
+    return declarations;
+}
+
+const QualifierDeclaration* findQualifierDeclaration(std::string_view name) {
+    return findByName(qualifierDeclarations(), name);
+}
+
+const Qualifier* findQualifier(const std::vector<Qualifier>& qualifiers, std::string_view name) {
+    return findByName(qualifiers, name);
+}
+
+std::vector<Qualifier> mergeQualifiers(std::vector<Qualifier> own, const std::vector<Qualifier>& inherited) {
+    for (const Qualifier& one : inherited) {
+        // A qualifier without a declaration comes from a foreign server; by default they are inherited.
+        const QualifierDeclaration* declaration = findQualifierDeclaration(one.name);
+        if (declaration != nullptr && !declaration->isInherited) continue;
+        if (findQualifier(own, one.name) == nullptr) own.push_back({one.name, one.value, true});
+    }
+    return own;
+}
 
 ClassChain declarationsOf(const CimClassInfo& info) {
     static DeclarationCache cache;
@@ -192,6 +246,7 @@ void addImpliedQualifiers(ClassDeclaration& declaration) {
     for (MethodDeclaration& method : declaration.methods) {
         for (ParameterDeclaration& parameter : method.parameters) {
             const bool isInput = parameter.direction == CimDirection::In;
+            // In is true by default (DSP0004), so an output has to deny it.
             parameter.qualifiers.push_back(flag("In", isInput));
             if (!isInput) parameter.qualifiers.push_back(flag("Out", true));
         }
@@ -217,10 +272,7 @@ bool isAssociation(const ClassChain& chain) {
 
 const MethodDeclaration* findMethod(const ClassChain& chain, std::string_view name) {
     for (const auto& declaration : chain) {
-        const auto found =
-            std::find_if(declaration->methods.begin(), declaration->methods.end(),
-                         [&](const MethodDeclaration& method) { return sameName(method.name, name); });
-        if (found != declaration->methods.end()) return &*found;
+        if (const MethodDeclaration* method = findByName(declaration->methods, name)) return method;
     }
     return nullptr;
 }

@@ -1,14 +1,68 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include <cstdint>
+#include <functional>
+#include <optional>
 #include <string>
+#include <string_view>
 #include <vector>
 
 #include "Framework/Model/CimError.h"
 #include "Framework/Model/ClassDeclaration.h"
-#include "Framework/Requests/RequestValues.h"
 
 namespace core {
+
+class CimInstance;
+
+/// A property of an instance, as a value.
+struct PropertyValue {
+    std::string name;
+    CimValue value;
+    bool isKey = false;
+    std::string referenceClass;  ///< empty unless a reference
+};
+
+/// An instance, as a value: a copy taken under the instance's lock.
+struct QUENX_EXPORT InstanceValue {
+    CimPath path;
+    std::vector<PropertyValue> properties;
+
+    /// The property of that name, without regard to case; null when it is not there.
+    const PropertyValue* find(std::string_view name) const;
+};
+
+/// Which properties an answer holds: all without a list, else those named (names that no class has are
+/// ignored).
+using PropertyFilter = std::optional<std::vector<std::string>>;
+
+QUENX_EXPORT bool isWanted(const PropertyFilter& filter, std::string_view name);
+
+/// A copy of the instance, under its lock; paths in it are completed with the namespace.
+InstanceValue readInstance(CimInstance& instance, CimPath path, const PropertyFilter& filter,
+                           const std::string& namespaceName);
+
+/// What narrows a walk over associations (DSP0200 5.4.2.8 to 5.4.2.11). An empty text narrows nothing.
+struct AssociationFilter {
+    std::string associationClass;
+    std::string resultClass;
+    std::string role;
+    std::string resultRole;
+};
+
+/// An argument of a method call, by name.
+struct Argument {
+    std::string name;
+    CimValue value;
+    /// The sender did not say of what type the texts in the value are: the declaration does.
+    bool isUntyped = false;
+};
+
+struct MethodResult {
+    std::uint32_t returnValue = 0;
+    std::vector<Argument> outputs;  ///< those that are not null
+    CimType returnType = CimType::Uint32;
+};
 
 /// What a client may ask of one namespace. The providers of this process answer it (CimRequests), and so may
 /// whatever stands in front of them or far away: another namespace, a connection to a server.
@@ -61,5 +115,25 @@ class QUENX_EXPORT CimOperations {
     /// InvalidClass for an unknown class.
     virtual std::vector<ClassChain> enumerateClasses(const std::string& className, bool deep) = 0;
 };
+
+// For implementations of it.
+
+/// Finds a class with its superclasses; empty for an unknown class.
+using ClassLookup = std::function<ClassChain(const std::string&)>;
+
+/// Gives the keys of an instance's path, which a client may send as texts, the types and the spelling that
+/// the class declares. A single key without a name gets that of the class's one key.
+/// CimError: invalid parameter for a path that names nothing, invalid class for an unknown class, invalid
+/// parameter when the keys are not exactly those of the class or a text does not read as its key's type.
+QUENX_EXPORT CimPath typedPath(const CimPath& path, const ClassLookup& classes);
+
+/// The arguments with their declared names and types; references in them as typedPath() makes them, where
+/// they fit. CimError (invalid parameter) for one that the method does not declare or that comes twice, and
+/// for a value of another kind than declared. Integers may come in any width that holds the value.
+std::vector<Argument> typedArguments(const MethodDeclaration& method, const std::vector<Argument>& arguments,
+                                     const ClassLookup& classes);
+
+/// The argument of that name, without regard to case; null when it is not there.
+const Argument* findArgument(const std::vector<Argument>& arguments, std::string_view name);
 
 }  // namespace core

@@ -1,14 +1,17 @@
 // SPDX-License-Identifier: Apache-2.0
-// Instances: enumerating, reading, deleting. And the classes that they are of.
+// Instances and their classes, and method calls. CimRequestsAssociations.cpp has the rest.
 #include "Framework/Requests/CimRequests.h"
 
+#include <algorithm>
 #include <functional>
 #include <map>
 #include <set>
 
 #include "Framework/Classes/InstanceList.h"
-#include "Framework/Model/CimError.h"
+#include "Framework/Model/CimInstance.h"
+#include "Framework/Model/CimPropertyList.h"
 #include "Framework/Requests/ServedClasses.h"
+#include "Utils/Exception.h"
 
 namespace core {
 
@@ -26,22 +29,75 @@ void visitInstances(const ServedClasses& classes, const std::string& className,
     }
 }
 
+/// The output parameter under which an instance handed back by a method is served.
+constexpr std::string_view kJobParameter = "Job";
+
+struct CallLists {
+    CimPropertyList in;
+    CimPropertyList out;
+};
+
+/// A value that the client gives for an output parameter goes to the method with the outputs: it decides.
+CallLists listsFor(const MethodDeclaration& method, const std::vector<Argument>& arguments) {
+    CallLists lists;
+    for (const ParameterDeclaration& parameter : method.parameters) {
+        const Argument* given = findArgument(arguments, parameter.name);
+        const bool isOutput = parameter.direction == CimDirection::Out;
+        // What is required and missing stays absent: the provider says so in its own words.
+        if (given == nullptr && !isOutput && !parameter.optional) continue;
+        CimPropertyList& list = isOutput ? lists.out : lists.in;
+        list.add(parameter.name,
+                 given == nullptr ? CimValue::null(parameter.type, parameter.isArray) : given->value);
+    }
+    return lists;
+}
+
+bool sameValues(const CimValue& left, const CimValue& right) {
+    if (const CimScalar* scalar = left.scalar())
+        return right.scalar() != nullptr && sameValue(*scalar, *right.scalar());
+    const auto* elements = left.elements();
+    const auto* others = right.elements();
+    if (elements == nullptr || others == nullptr) return left.isNull() && right.isNull();
+    return std::equal(elements->begin(), elements->end(), others->begin(), others->end(), sameValue);
+}
+
+/// What the method has put out: of its outputs, not those that still are what the client gave for them.
+std::vector<Argument> outputsOf(const CallLists& lists, const std::vector<Argument>& arguments,
+                                const CimInstance* handedBack, const std::string& namespaceName) {
+    std::vector<Argument> outputs;
+    for (const auto& property : lists.out.getProperties()) {
+        if (sameName(property->getName(), kJobParameter)) continue;  // an instance, handed back
+        CimValue value = property->getValue();
+        const Argument* given = findArgument(arguments, property->getName());
+        if (given != nullptr && sameValues(given->value, value)) continue;
+        if (!value.isNull()) outputs.push_back({property->getName(), std::move(value)});
+    }
+    if (handedBack != nullptr) {
+        CimPath path = CimPath::of(*handedBack);
+        path.completeNamespace(namespaceName);
+        outputs.push_back(
+            {std::string(kJobParameter), CimValue::of(CimType::Reference, CimScalar(std::move(path)))});
+    }
+    return outputs;
+}
+
+/// A method reports a wrong argument by an exception, anything else by its return value.
+unsigned int call(CimInstance& instance, const std::string& method, CallLists& lists,
+                  CimInstance*& handedBack) {
+    try {
+        return instance.invokeMethod(method, lists.in, lists.out, handedBack);
+    } catch (const utils::EUnspecifiedError& refusal) {
+        throw CimError(CimStatus::InvalidParameter, refusal.what());
+    }
+}
+
 }  // namespace
 
-CimOperations::~CimOperations() = default;
-
-CimRequests::CimRequests(std::string namespaceName)
-    : CimRequests(std::move(namespaceName), *GetCimBroker()) {}
-
-CimRequests::CimRequests(std::string namespaceName, CimBroker& broker)
-    : m_namespace(std::move(namespaceName)), m_broker(broker) {}
-
-CimRequests::~CimRequests() = default;
+CimRequests::CimRequests(std::string namespaceName) : m_namespace(std::move(namespaceName)) {}
 
 std::vector<InstanceValue> CimRequests::enumerateInstances(const std::string& className,
                                                            const PropertyFilter& filter) {
-    const ServedClasses classes(m_broker);
-    return withCimErrors([&] {
+    return answerRequest([&](const ServedClasses& classes) {
         std::vector<InstanceValue> result;
         visitInstances(classes, className, [&](CimInstance& instance, CimPath path) {
             result.push_back(readInstance(instance, std::move(path), filter, m_namespace));
@@ -51,8 +107,7 @@ std::vector<InstanceValue> CimRequests::enumerateInstances(const std::string& cl
 }
 
 std::vector<CimPath> CimRequests::enumerateInstanceNames(const std::string& className) {
-    const ServedClasses classes(m_broker);
-    return withCimErrors([&] {
+    return answerRequest([&](const ServedClasses& classes) {
         std::vector<CimPath> result;
         visitInstances(classes, className, [&](CimInstance&, CimPath path) {
             path.completeNamespace(m_namespace);
@@ -63,17 +118,16 @@ std::vector<CimPath> CimRequests::enumerateInstanceNames(const std::string& clas
 }
 
 InstanceValue CimRequests::getInstance(const CimPath& path, const PropertyFilter& filter) {
-    const ServedClasses classes(m_broker);
-    return withCimErrors([&] {
+    return answerRequest([&](const ServedClasses& classes) {
         CimPath typed = classes.typed(path);
         CimInstance& instance = classes.requireInstance(typed);
+        // Its own path: a client may have spelled names in another case.
         return readInstance(instance, CimPath::of(instance), filter, m_namespace);
     });
 }
 
 void CimRequests::deleteInstance(const CimPath& path) {
-    const ServedClasses classes(m_broker);
-    withCimErrors([&] {
+    answerRequest([&](const ServedClasses& classes) {
         CimPath typed = classes.typed(path);
         bool isSupported = false;
         for (const ServedClass* each : classes.named(typed.getClassName())) {
@@ -86,6 +140,7 @@ void CimRequests::deleteInstance(const CimPath& path) {
             throw CimError(CimStatus::Failed, "the deletion of " + typed.toString() + " ended with code " +
                                                   std::to_string(code));
         }
+        // Of a class without deletion a client learns first whether the instance is there at all.
         if (isSupported) throw CimError(CimStatus::NotFound, typed.toString() + " names no instance");
         classes.requireInstance(typed);
         throw CimError(CimStatus::NotSupported,
@@ -93,12 +148,39 @@ void CimRequests::deleteInstance(const CimPath& path) {
     });
 }
 
+MethodResult CimRequests::invokeMethod(const CimPath& path, const std::string& method,
+                                       const std::vector<Argument>& arguments) {
+    return answerRequest([&](const ServedClasses& classes) -> MethodResult {
+        const ClassChain chain = classes.chainOf(path.getClassName());
+        // Not InvalidClass, which DSP0200 does not list for extrinsic methods.
+        if (chain.empty()) {
+            throw CimError(CimStatus::NotFound, "no class \"" + path.getClassName() + "\" is served");
+        }
+        const MethodDeclaration* declared = findMethod(chain, method);
+        if (declared == nullptr) {
+            throw CimError(CimStatus::MethodNotFound, chain.front()->name + " has no method " + method);
+        }
+        // No class here has static methods.
+        if (!path.isInstancePath()) {
+            throw CimError(CimStatus::MethodNotAvailable, declared->name + " is called on an instance");
+        }
+        CimPath typed = classes.typed(path);
+        const std::vector<Argument> given = typedArguments(
+            *declared, arguments, [&](const std::string& name) { return classes.chainOf(name); });
+        CimInstance& instance = classes.requireInstance(typed);
+        CallLists lists = listsFor(*declared, given);
+        CimInstance* handedBack = nullptr;
+        const unsigned int returnValue = call(instance, declared->name, lists, handedBack);
+        return {returnValue, outputsOf(lists, given, handedBack, m_namespace), declared->returnType};
+    });
+}
+
 ClassChain CimRequests::getClass(const std::string& className) {
-    return ServedClasses(m_broker).chainOf(className);
+    return ServedClasses().chainOf(className);
 }
 
 std::vector<ClassChain> CimRequests::enumerateClasses(const std::string& className, bool deep) {
-    const ServedClasses classes(m_broker);
+    const ServedClasses classes;
     if (!className.empty()) classes.requireChain(className);
     // By name, since many served classes share their superclasses.
     std::map<std::string, ClassChain> found;

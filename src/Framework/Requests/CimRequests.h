@@ -5,17 +5,12 @@
 
 namespace core {
 
-class CimBroker;
-
 /// The request layer: what the providers loaded into this process answer. Every front (command line, CIM-XML,
 /// an object manager) calls it. Classes are served in one namespace. Each operation is a request scope of its
 /// own; an exception out of a provider becomes CimStatus::Failed with its text.
 class QUENX_EXPORT CimRequests : public CimOperations {
   public:
-    /// With the process's broker.
     explicit CimRequests(std::string namespaceName);
-    CimRequests(std::string namespaceName, CimBroker& broker);
-    ~CimRequests() override;
 
     const std::string& getNamespace() const override { return m_namespace; }
 
@@ -44,7 +39,6 @@ class QUENX_EXPORT CimRequests : public CimOperations {
 
   private:
     std::string m_namespace;
-    CimBroker& m_broker;
 };
 
 }  // namespace core

@@ -8,7 +8,7 @@
 #include "Framework/Classes/InstanceList.h"
 #include "Framework/Model/CimError.h"
 #include "Framework/Model/CimInstance.h"
-#include "Framework/Model/CimPropertyRef.h"
+#include "Framework/Model/CimProperty.h"
 #include "Framework/Requests/CimRequests.h"
 #include "Framework/Requests/ServedClasses.h"
 
@@ -24,6 +24,7 @@ struct End {
 
 std::vector<End> endsOf(const CimInstance& association) {
     std::vector<End> ends;
+    // One lock around all ends: a rebuild on another thread shows whole or not at all.
     const RecursiveLocker lock(association.getMutex());
     for (const CimProperty* property : association.getProperties()) {
         const auto* reference = dynamic_cast<const CimPropertyRef*>(property);
@@ -41,6 +42,7 @@ bool isRole(const std::string& wanted, const End& end) {
 void visitReferences(const ServedClasses& classes, const CimPath& path, const std::string& associationClass,
                      const std::string& role,
                      const std::function<void(CimInstance&, const std::vector<End>&, std::size_t)>& visit) {
+    // Every association is looked at, whatever classes it joins: only its instances tell what they refer to.
     for (const ServedClass* each : classes.associations(associationClass)) {
         for (CimInstance* instance : InstanceRange(each->object->getInstances())) {
             const std::vector<End> ends = endsOf(*instance);
@@ -74,6 +76,7 @@ std::vector<CimPath> farEnds(const ServedClasses& classes, const CimPath& path, 
     visitReferences(classes, startOf(classes, path, by), by.associationClass, by.role,
                     [&](CimInstance&, const std::vector<End>& ends, std::size_t near) {
                         for (std::size_t i = 0; i < ends.size(); ++i) {
+                            // An association of an object with itself is visited once for each end.
                             if (i == near || !leadsTo(classes, by, ends[i])) continue;
                             if (seen.insert(ends[i].path.toString()).second) result.push_back(ends[i].path);
                         }
@@ -85,26 +88,23 @@ std::vector<CimPath> farEnds(const ServedClasses& classes, const CimPath& path, 
 /// holds what it finds.
 class InstanceFinder {
   public:
-    explicit InstanceFinder(CimBroker& broker) : m_broker(broker) {}
-
     CimInstance* find(CimPath& path) {
         const auto [entry, isNew] = m_classes.try_emplace(foldName(path.getClassName()));
         if (isNew) enumerate(path.getClassName(), entry->second);
         const auto found = entry->second.find(path.toString());
         // A path may be spelled otherwise than its instance spells it.
-        return found == entry->second.end() ? m_broker.getInstanceByPath(path) : found->second;
+        return found == entry->second.end() ? GetCimBroker()->getInstanceByPath(path) : found->second;
     }
 
   private:
     using Instances = std::unordered_map<std::string, CimInstance*>;
 
     void enumerate(const std::string& className, Instances& instances) {
-        for (CimInstance* instance : InstanceRange(m_broker.getInstances(className, ""))) {
+        for (CimInstance* instance : InstanceRange(GetCimBroker()->getInstances(className, ""))) {
             instances.emplace(CimPath::of(*instance).toString(), instance);
         }
     }
 
-    CimBroker& m_broker;
     std::map<std::string, Instances> m_classes;
 };
 
@@ -125,10 +125,9 @@ void visitAssociations(const ServedClasses& classes, const CimPath& path, const 
 
 std::vector<InstanceValue> CimRequests::associators(const CimPath& path, const AssociationFilter& by,
                                                     const PropertyFilter& filter) {
-    const ServedClasses classes(m_broker);
-    return withCimErrors([&] {
+    return answerRequest([&](const ServedClasses& classes) {
         std::vector<InstanceValue> result;
-        InstanceFinder finder(m_broker);
+        InstanceFinder finder;
         for (CimPath& far : farEnds(classes, path, by)) {
             if (CimInstance* instance = finder.find(far)) {
                 result.push_back(readInstance(*instance, std::move(far), filter, m_namespace));
@@ -139,8 +138,7 @@ std::vector<InstanceValue> CimRequests::associators(const CimPath& path, const A
 }
 
 std::vector<CimPath> CimRequests::associatorNames(const CimPath& path, const AssociationFilter& by) {
-    const ServedClasses classes(m_broker);
-    return withCimErrors([&] {
+    return answerRequest([&](const ServedClasses& classes) {
         std::vector<CimPath> result = farEnds(classes, path, by);
         for (CimPath& far : result)
             far.completeNamespace(m_namespace);
@@ -150,8 +148,7 @@ std::vector<CimPath> CimRequests::associatorNames(const CimPath& path, const Ass
 
 std::vector<InstanceValue> CimRequests::references(const CimPath& path, const AssociationFilter& by,
                                                    const PropertyFilter& filter) {
-    const ServedClasses classes(m_broker);
-    return withCimErrors([&] {
+    return answerRequest([&](const ServedClasses& classes) {
         std::vector<InstanceValue> result;
         visitAssociations(classes, path, by, [&](CimInstance& association, CimPath own) {
             result.push_back(readInstance(association, std::move(own), filter, m_namespace));
@@ -161,8 +158,7 @@ std::vector<InstanceValue> CimRequests::references(const CimPath& path, const As
 }
 
 std::vector<CimPath> CimRequests::referenceNames(const CimPath& path, const AssociationFilter& by) {
-    const ServedClasses classes(m_broker);
-    return withCimErrors([&] {
+    return answerRequest([&](const ServedClasses& classes) {
         std::vector<CimPath> result;
         visitAssociations(classes, path, by, [&](CimInstance&, CimPath own) {
             own.completeNamespace(m_namespace);

@@ -1,9 +1,75 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Framework/Requests/ProviderSession.h"
 
+#include <dlfcn.h>
+
+#include <algorithm>
+#include <filesystem>
+
 #include "Framework/Requests/CimRequests.h"
 
 namespace core {
+
+namespace {
+
+constexpr const char* kPrefix = "libQuenx_";
+constexpr const char* kSuffix = ".so";
+
+#ifdef QUENX_SANITIZED
+// A leak reported after unloading has no file and line unless the library stays mapped.
+constexpr int kLoadFlags = RTLD_NOW | RTLD_LOCAL | RTLD_NODELETE;
+#else
+constexpr int kLoadFlags = RTLD_NOW | RTLD_LOCAL;
+#endif
+
+std::vector<std::filesystem::path> librariesIn(const std::string& directory) {
+    std::vector<std::filesystem::path> files;
+    for (const auto& entry : std::filesystem::directory_iterator(directory)) {
+        const std::string name = entry.path().filename().string();
+        if (name.starts_with(kPrefix) && name.ends_with(kSuffix)) files.push_back(entry.path());
+    }
+    std::sort(files.begin(), files.end());
+    return files;
+}
+
+/// The loader's words for its latest failure, without the file, which it names first when it can.
+std::string loaderReason(const std::string& file) {
+    const char* text = dlerror();
+    const std::string reason = text == nullptr ? "unknown reason" : text;
+    return reason.starts_with(file + ": ") ? reason.substr(file.size() + 2) : reason;
+}
+
+}  // namespace
+
+std::string ProviderLibraries::defaultDirectory() {
+    Dl_info own{};
+    dladdr(kPrefix, &own);
+    std::error_code error;
+    return std::filesystem::weakly_canonical(own.dli_fname, error).parent_path().string();
+}
+
+void ProviderLibraries::Close::operator()(void* handle) const {
+    dlclose(handle);
+}
+
+ProviderLibraries::~ProviderLibraries() {
+    while (!m_handles.empty())
+        m_handles.pop_back();
+}
+
+void ProviderLibraries::load(const std::string& directory) {
+    for (const std::filesystem::path& file : librariesIn(directory)) {
+        // An absolute path: a name without a slash would send the loader to its own search path.
+        const std::string path = std::filesystem::absolute(file).string();
+        Handle handle(dlopen(path.c_str(), kLoadFlags));
+        if (handle == nullptr) {
+            m_problems.push_back({file.string(), loaderReason(path)});
+            continue;
+        }
+        m_handles.push_back(std::move(handle));
+        m_loaded.push_back(file.string());
+    }
+}
 
 ProviderSession::ProviderSession(const std::string& configurationFile) {
     // Constructed first, since whoever asks for the current configuration from here on gets this one.

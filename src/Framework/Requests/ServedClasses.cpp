@@ -4,13 +4,13 @@
 #include <algorithm>
 #include <iterator>
 
-#include "Framework/Model/CimError.h"
-#include "Framework/Requests/DeclaredTypes.h"
+#include "Framework/Requests/CimOperations.h"
 
 namespace core {
 
-ServedClasses::ServedClasses(CimBroker& broker) : m_broker(broker), m_uses(broker.useAgents()) {
-    for (const AgentUse& use : m_uses) {
+ServedClasses::ServedClasses() {
+    // The scope goes on using the agents.
+    for (const AgentUse& use : GetCimBroker()->useAgents()) {
         const auto classes = use.agent().getClasses().getAll();
         m_classes.insert(m_classes.end(), classes.begin(), classes.end());
     }
@@ -21,29 +21,28 @@ ServedClasses::ServedClasses(CimBroker& broker) : m_broker(broker), m_uses(broke
     }
 }
 
-std::vector<const ServedClass*> ServedClasses::derivedFrom(std::string_view className) const {
+template <class Predicate>
+std::vector<const ServedClass*> ServedClasses::select(Predicate&& isSelected) const {
     std::vector<const ServedClass*> result;
     std::copy_if(m_classes.begin(), m_classes.end(), std::back_inserter(result),
-                 [&](const ServedClass* each) { return core::derivesFrom(each->chain, className); });
+                 [&](const ServedClass* each) { return isSelected(*each); });
+    return result;
+}
+
+std::vector<const ServedClass*> ServedClasses::derivedFrom(std::string_view className) const {
+    auto result = select([&](const ServedClass& each) { return core::derivesFrom(each.chain, className); });
     if (result.empty()) requireChain(className);
     return result;
 }
 
 std::vector<const ServedClass*> ServedClasses::named(std::string_view className) const {
-    std::vector<const ServedClass*> result;
-    std::copy_if(m_classes.begin(), m_classes.end(), std::back_inserter(result),
-                 [&](const ServedClass* each) { return sameName(each->name, className); });
-    return result;
+    return select([&](const ServedClass& each) { return sameName(each.name, className); });
 }
 
 std::vector<const ServedClass*> ServedClasses::associations(std::string_view className) const {
-    std::vector<const ServedClass*> result;
-    std::copy_if(m_classes.begin(), m_classes.end(), std::back_inserter(result),
-                 [&](const ServedClass* each) {
-                     return isAssociation(each->chain) &&
-                            (className.empty() || core::derivesFrom(each->chain, className));
-                 });
-    return result;
+    return select([&](const ServedClass& each) {
+        return isAssociation(each.chain) && (className.empty() || core::derivesFrom(each.chain, className));
+    });
 }
 
 ClassChain ServedClasses::chainOf(std::string_view className) const {
@@ -67,7 +66,7 @@ CimPath ServedClasses::typed(const CimPath& path) const {
 }
 
 CimInstance& ServedClasses::requireInstance(CimPath& path) const {
-    if (CimInstance* instance = m_broker.getInstanceByPath(path)) return *instance;
+    if (CimInstance* instance = GetCimBroker()->getInstanceByPath(path)) return *instance;
     throw CimError(CimStatus::NotFound, path.toString() + " names no instance");
 }
 

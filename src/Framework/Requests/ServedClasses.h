@@ -5,16 +5,16 @@
 #include <vector>
 
 #include "Framework/Classes/CimBroker.h"
-#include "Framework/Classes/RequestScope.h"
+#include "Framework/Classes/InstanceLifetime.h"
+#include "Framework/Model/CimError.h"
 
 namespace core {
 
 /// What is served at the moment, for the length of one request: the agents cannot leave meanwhile, and the
-/// instances that the request meets stay alive. Must outlive what a provider throws: the type of an exception
-/// goes with its library. Used on the stack of one thread.
+/// instances that the request meets stay alive. Used on the stack of one thread.
 class ServedClasses {
   public:
-    explicit ServedClasses(CimBroker& broker);
+    ServedClasses();
 
     /// The classes that are of this class: itself and its subclasses, by every agent; empty for one
     /// that is only mentioned. CimError (invalid class) when it is unknown.
@@ -23,7 +23,6 @@ class ServedClasses {
     std::vector<const ServedClass*> named(std::string_view className) const;
     /// The associations among the classes; with a name only those derived from it.
     std::vector<const ServedClass*> associations(std::string_view className) const;
-    const std::vector<const ServedClass*>& all() const { return m_classes; }
 
     /// The chains of the served classes and of those that they mention.
     const std::vector<const ClassChain*>& chains() const { return m_chains; }
@@ -38,11 +37,20 @@ class ServedClasses {
     CimInstance& requireInstance(CimPath& path) const;
 
   private:
+    template <class Predicate>
+    std::vector<const ServedClass*> select(Predicate&& isSelected) const;
+
     const RequestScope m_scope;
-    CimBroker& m_broker;
-    std::vector<AgentUse> m_uses;
     std::vector<const ServedClass*> m_classes;
     std::vector<const ClassChain*> m_chains;
 };
+
+/// Runs the body of a request on what is served; it fails with CimError only.
+template <class Body>
+auto answerRequest(Body&& body) {
+    // Outlives what a provider throws: the type of an exception goes with its library.
+    const ServedClasses classes;
+    return withCimErrors([&] { return body(classes); });
+}
 
 }  // namespace core

@@ -6,8 +6,8 @@
 #include <string>
 #include <vector>
 
+#include "Utils/Os/Linux/Mutex.h"
 #include "Utils/Os/Linux/Thread.h"
-#include "Utils/ThreadAnnotations.h"
 
 namespace host {
 

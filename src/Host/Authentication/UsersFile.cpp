@@ -15,7 +15,7 @@
 #include <stdexcept>
 
 #include "Host/Authentication/PasswordChecker.h"
-#include "Utils/Os/Linux/Descriptor.h"
+#include "Utils/Os/Linux/linux.h"
 
 namespace host {
 

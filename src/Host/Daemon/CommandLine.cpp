@@ -7,7 +7,7 @@
 #include <algorithm>
 #include <iostream>
 
-#include "Framework/Requests/ProviderLibraries.h"
+#include "Framework/Requests/ProviderSession.h"
 #include "Host/Daemon/SettingsField.h"
 
 namespace host {

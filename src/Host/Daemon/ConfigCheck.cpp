@@ -14,7 +14,7 @@
 #include "Host/Server/ServerCertificate.h"
 #include "MidAPI/Simulator/Simulator.h"
 #include "MidAPI/ma.h"
-#include "Utils/Os/Linux/Descriptor.h"
+#include "Utils/Os/Linux/linux.h"
 
 namespace host {
 

@@ -4,7 +4,7 @@
 #include <algorithm>
 #include <array>
 
-#include "Framework/Requests/DeclaredTypes.h"
+#include "Framework/Requests/CimOperations.h"
 #include "Host/Operations/Operations.h"
 
 namespace host {

@@ -7,8 +7,8 @@
 
 #include "CimXml/Response.h"
 #include "Host/Settings.h"
+#include "Utils/Os/Linux/Mutex.h"
 #include "Utils/Os/Linux/Thread.h"
-#include "Utils/ThreadAnnotations.h"
 
 namespace host {
 

@@ -8,7 +8,7 @@
 #include <string_view>
 
 #include "CimXml/Request.h"
-#include "Framework/Requests/RequestValues.h"
+#include "Framework/Requests/CimOperations.h"
 
 namespace host {
 

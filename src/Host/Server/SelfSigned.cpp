@@ -14,7 +14,6 @@
 #include <stdexcept>
 
 #include "Host/Server/ServerCertificate.h"
-#include "Utils/Os/Linux/Descriptor.h"
 #include "Utils/Os/Linux/linux.h"
 
 namespace host {

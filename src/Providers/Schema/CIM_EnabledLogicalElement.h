@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
-#include "Framework/Model/CimProperties.h"
+#include "Framework/Model/CimProperty.h"
 #include "Providers/Schema/CIM_LogicalElement.h"
 #include "Utils/Export.h"
 

@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Providers/Schema/CIM_LogicalElement.h"
 
+#include "Framework/Model/CimClassInfo.h"
+
 namespace {
 
 constexpr core::CimElementText kTexts[] = {

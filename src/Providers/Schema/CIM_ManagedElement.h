@@ -2,7 +2,7 @@
 #pragma once
 
 #include "Framework/Model/CimInstance.h"
-#include "Framework/Model/CimProperties.h"
+#include "Framework/Model/CimProperty.h"
 #include "Utils/Export.h"
 
 /// DMTF CIM_ManagedElement: root of everything that can be managed.

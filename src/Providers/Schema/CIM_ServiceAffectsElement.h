@@ -2,7 +2,7 @@
 #pragma once
 
 #include "Framework/Model/CimInstance.h"
-#include "Framework/Model/CimProperties.h"
+#include "Framework/Model/CimProperty.h"
 #include "Providers/Schema/CimPropertyRefT.h"
 #include "Utils/Export.h"
 

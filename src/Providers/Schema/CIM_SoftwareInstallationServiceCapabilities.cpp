@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Providers/Schema/CIM_SoftwareInstallationServiceCapabilities.h"
 
+#include "Framework/Model/CimClassInfo.h"
 #include "Providers/Schema/ValueMapTexts.h"
 
 namespace {

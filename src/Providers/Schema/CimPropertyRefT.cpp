@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Providers/Schema/CimPropertyRefT.h"
 
+#include "Framework/Model/CimClassInfo.h"
 #include "Providers/Schema/CIM_Capabilities.h"
 #include "Providers/Schema/CIM_Job.h"
 #include "Providers/Schema/CIM_ManagedElement.h"

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
-#include "Framework/Model/CimPropertyRef.h"
+#include "Framework/Model/CimProperty.h"
 #include "Utils/Export.h"
 
 class QUENX_EXPORT CIM_Capabilities;

@@ -4,7 +4,7 @@
 #include <string>
 #include <utility>
 
-#include "Utils/Os/Linux/Atomic.h"
+#include "Utils/Os/Linux/Mutex.h"
 
 /// A hold on the one adapter that may be serviced at a time. Verification takes it, the job owns it.
 ///

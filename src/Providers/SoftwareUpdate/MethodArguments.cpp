@@ -1,8 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Providers/SoftwareUpdate/MethodArguments.h"
 
-#include "Framework/Model/CimProperties.h"
-#include "Framework/Model/CimPropertyRef.h"
+#include "Framework/Model/CimProperty.h"
 #include "Providers/ClassObjects.h"
 #include "Providers/Schema/ProviderInterfaces.h"
 #include "Utils/Utils.h"

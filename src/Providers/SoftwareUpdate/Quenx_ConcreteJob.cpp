@@ -3,6 +3,7 @@
 
 #include <optional>
 
+#include "Framework/Model/CimClassInfo.h"
 #include "MidAPI/ma.h"
 #include "Providers/ClassObjects.h"
 #include "Providers/SoftwareUpdate/ImageVerification.h"

@@ -6,12 +6,13 @@
 #include <string>
 #include <vector>
 
+#include "Framework/Model/CimClassInfo.h"
 #include "Providers/Schema/CIM_ConcreteJob.h"
 #include "Providers/Schema/ValueMaps.h"
 #include "Providers/SoftwareUpdate/AdapterClaim.h"
 #include "Utils/FirmwareTypes.h"
+#include "Utils/Os/Linux/Mutex.h"
 #include "Utils/Os/Linux/Thread.h"
-#include "Utils/ThreadAnnotations.h"
 #include "Utils/Time.h"
 
 class JobThread;

@@ -3,7 +3,7 @@
 
 #include <algorithm>
 
-#include "Framework/Classes/RequestScope.h"
+#include "Framework/Classes/InstanceLifetime.h"
 #include "Providers/SoftwareUpdate/MethodArguments.h"
 #include "Providers/SoftwareUpdate/Quenx_ConcreteJobClass.h"
 #include "Utils/Os/Linux/linux.h"

@@ -3,7 +3,7 @@
 
 #include <string>
 
-#include "Framework/Classes/CimAgent.h"
+#include "Framework/Classes/CimBroker.h"
 
 namespace core {
 

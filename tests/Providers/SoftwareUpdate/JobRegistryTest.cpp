@@ -3,7 +3,7 @@
 
 #include <thread>
 
-#include "Framework/Classes/InstanceReaper.h"
+#include "Framework/Classes/InstanceLifetime.h"
 #include "Providers/SoftwareUpdate/MethodResults.h"
 #include "Providers/SoftwareUpdate/Quenx_ConcreteJobClass.h"
 #include "Providers/SoftwareUpdate/UpdateTest.h"

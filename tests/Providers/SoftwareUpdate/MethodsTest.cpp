@@ -5,7 +5,7 @@
 #include <set>
 
 #include "Framework/Classes/CimBroker.h"
-#include "Framework/Classes/RequestScope.h"
+#include "Framework/Classes/InstanceLifetime.h"
 #include "MidAPI/Image/RomFormat.h"
 #include "Providers/Schema/ProviderInterfaces.h"
 #include "Providers/SoftwareUpdate/UpdateTest.h"

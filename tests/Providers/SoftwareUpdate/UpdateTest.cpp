@@ -3,7 +3,7 @@
 
 #include <algorithm>
 
-#include "Framework/Classes/InstanceReaper.h"
+#include "Framework/Classes/InstanceLifetime.h"
 #include "Support/TestRoms.h"
 
 namespace test {

@@ -117,52 +117,36 @@ void SMASHv2Config::readLine(std::string line, StringArray& directories) {
     words.imbue(std::locale::classic());
     std::string key;
     words >> key;
-    if (key == SMASHv2_NAMESPACE_KEY) {
-        readNamespace(words);
-    } else if (key == SMASHv2_SEMAPHORE_TIMEOUT_KEY) {
-        readLockerTimeout(words);
-    } else if (key == SMASHv2_CUSTOMIZATION_KEY) {
-        readCustomization(words);
-    } else if (key == kReleaseClaimKey) {
-        readReleaseClaimAfterCheck(words);
-    } else if (key == SMASHv2_FWFILE_PATH_KEY) {
+    if (key == SMASHv2_FWFILE_PATH_KEY) {
         std::string list;
         std::getline(words, list);
         addDirectories(list, directories);
+    } else if (key == SMASHv2_CUSTOMIZATION_KEY) {
+        std::uint16_t value = 0;
+        if (!(words >> value)) return;
+        m_oemCustomization = value;
+        formatDebugLog(__FILE__, kReadingFunction, __LINE__, "Read OEMCustomizeable : %d", value);
+    } else {
+        std::string word;
+        words >> word;
+        takeWord(key, std::move(word));
     }
 }
 
-void SMASHv2Config::readNamespace(std::istream& words) {
-    std::string word;
-    words >> word;
-    if (word.compare(0, kRootNamespace.size(), kRootNamespace) != 0) return;
-    m_namespace = std::move(word);
-    formatDebugLog(__FILE__, kReadingFunction, __LINE__, "Read NameSpace : %s", m_namespace.c_str());
-}
-
-void SMASHv2Config::readLockerTimeout(std::istream& words) {
-    std::string word;
-    words >> word;
-    toUint(word, m_lockerTimeout);
-    // Also after a refusal, with the value that stands.
-    formatDebugLog(__FILE__, kReadingFunction, __LINE__, "Read LockerTimeout : %d",
-                   static_cast<std::int32_t>(m_lockerTimeout));
-}
-
-void SMASHv2Config::readCustomization(std::istream& words) {
-    std::uint16_t value = 0;
-    if (!(words >> value)) return;
-    m_oemCustomization = value;
-    formatDebugLog(__FILE__, kReadingFunction, __LINE__, "Read OEMCustomizeable : %d", value);
-}
-
-void SMASHv2Config::readReleaseClaimAfterCheck(std::istream& words) {
-    std::string word;
-    words >> word;
-    if (word != "0" && word != "1") return;
-    m_releaseClaimAfterCheck = word == "1";
-    formatDebugLog(__FILE__, kReadingFunction, __LINE__, "Read ReleaseClaimAfterCheck : %d",
-                   m_releaseClaimAfterCheck);
+void SMASHv2Config::takeWord(const std::string& key, std::string word) {
+    if (key == SMASHv2_NAMESPACE_KEY && word.starts_with(kRootNamespace)) {
+        m_namespace = std::move(word);
+        formatDebugLog(__FILE__, kReadingFunction, __LINE__, "Read NameSpace : %s", m_namespace.c_str());
+    } else if (key == SMASHv2_SEMAPHORE_TIMEOUT_KEY) {
+        toUint(word, m_lockerTimeout);
+        // Also after a refusal, with the value that stands.
+        formatDebugLog(__FILE__, kReadingFunction, __LINE__, "Read LockerTimeout : %d",
+                       static_cast<std::int32_t>(m_lockerTimeout));
+    } else if (key == kReleaseClaimKey && (word == "0" || word == "1")) {
+        m_releaseClaimAfterCheck = word == "1";
+        formatDebugLog(__FILE__, kReadingFunction, __LINE__, "Read ReleaseClaimAfterCheck : %d",
+                       m_releaseClaimAfterCheck);
+    }
 }
 
 }  // namespace utils

@@ -2,7 +2,6 @@
 #pragma once
 
 #include <cstdint>
-#include <iosfwd>
 #include <memory>
 #include <string>
 
@@ -10,7 +9,6 @@
 #include "Utils/Os/Linux/Mutex.h"
 #include "Utils/Singleton.h"
 #include "Utils/StringArray.h"
-#include "Utils/ThreadAnnotations.h"
 
 /// The keys and defaults of the configuration, and the registry-style paths that platforms with a registry
 /// use.
@@ -57,10 +55,7 @@ class QUENX_EXPORT SMASHv2Config : public AutoSingleton<SMASHv2Config> {
 
   private:
     void readLine(std::string line, StringArray& directories) QUENX_REQUIRES(m_mutex);
-    void readNamespace(std::istream& words) QUENX_REQUIRES(m_mutex);
-    void readLockerTimeout(std::istream& words) QUENX_REQUIRES(m_mutex);
-    void readCustomization(std::istream& words) QUENX_REQUIRES(m_mutex);
-    void readReleaseClaimAfterCheck(std::istream& words) QUENX_REQUIRES(m_mutex);
+    void takeWord(const std::string& key, std::string word) QUENX_REQUIRES(m_mutex);
 
     Mutex m_mutex;
     std::uint16_t m_oemCustomization QUENX_GUARDED_BY(m_mutex) = 0;

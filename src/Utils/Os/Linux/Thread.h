@@ -6,7 +6,6 @@
 #include <memory>
 
 #include "Utils/Export.h"
-#include "Utils/Os/Linux/Atomic.h"
 #include "Utils/Os/Linux/Mutex.h"
 
 namespace utils {

@@ -1,6 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include <sys/types.h>
+#include <unistd.h>
+
 #include <cstddef>
 #include <cstdint>
 #include <optional>
@@ -23,9 +26,6 @@ QUENX_EXPORT std::uint64_t getuSecondsSinceEpoch() noexcept;
 /// The host's name, "localhost" when it cannot be had.
 QUENX_EXPORT std::string getHostname();
 
-/// The names of the network interfaces, in the kernel's order; empty when they cannot be had.
-QUENX_EXPORT utils::StringArray getNetworkInterfaceNames();
-
 /// The size in bytes of a regular file.
 /// @throws utils::Exception "Could not open the file %s" for what does not exist, cannot be opened, has a NUL
 /// in its path, is larger than 2^31-1 bytes or is neither a file nor a directory, which is told before it is
@@ -47,5 +47,46 @@ QUENX_EXPORT bool isThisADir(const std::string& path) noexcept;
 
 /// The names in a directory without "." and "..", sorted; empty when it cannot be read.
 QUENX_EXPORT utils::StringArray listDirectory(const std::string& path);
+
+/// Owns a file descriptor; a negative number is none. Not for use by two threads at once.
+class Descriptor {
+  public:
+    explicit Descriptor(int number) noexcept : m_number(number) {}
+    ~Descriptor() {
+        if (m_number >= 0) ::close(m_number);
+    }
+    Descriptor(const Descriptor&) = delete;
+    Descriptor& operator=(const Descriptor&) = delete;
+    int number() const noexcept { return m_number; }
+
+  private:
+    const int m_number;
+};
+
+/// An exclusive lock (flock) on a file, between processes and between the threads of one. The kernel drops it
+/// when its holder dies; the file stays, since removing it would let two others lock two different files.
+class QUENX_EXPORT FileLock {
+  public:
+    enum class Mode { Wait, Try };
+
+    /// Makes the file when it is not there. With Mode::Try a lock that somebody else holds is not an error.
+    /// @throws std::system_error "cannot lock PATH: REASON"
+    FileLock(const std::string& path, Mode mode);
+    FileLock(const FileLock&) = delete;
+    FileLock& operator=(const FileLock&) = delete;
+    ~FileLock();
+
+    bool isHeld() const { return m_held; }
+
+    /// Who holds the lock that this one did not get: the process id that the holder left in the file, 0 when
+    /// it was not there yet.
+    pid_t holder() const;
+
+  private:
+    void leaveProcessId() const;
+
+    const Descriptor m_file;
+    bool m_held = false;
+};
 
 }  // namespace os

@@ -85,9 +85,3 @@ TEST(LinuxTest, ReadsWholeFilesUpToALimit) {
         EXPECT_EQ(error.what(), "cannot read " + folder.path() + ": Is a directory");
     }
 }
-
-TEST(LinuxTest, NamesTheInterfacesOfTheHost) {
-    for (const std::string& interface : os::getNetworkInterfaceNames()) {
-        EXPECT_EQ(access(("/sys/class/net/" + interface).c_str(), F_OK), 0) << interface;
-    }
-}

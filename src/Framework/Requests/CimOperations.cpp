@@ -1,22 +1,32 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "Framework/Requests/DeclaredTypes.h"
+#include "Framework/Requests/CimOperations.h"
 
 #include <algorithm>
 
-#include "Framework/Model/CimError.h"
+#include "Framework/Model/CimInstance.h"
+#include "Framework/Model/CimProperty.h"
 
 namespace core {
 
 namespace {
 
+PropertyValue readProperty(const CimProperty& property, const std::string& namespaceName) {
+    PropertyValue result{property.getName(), property.getValue(), property.isKey(), {}};
+    // Providers do not know in which namespace they are served.
+    if (const char* target = property.getReferenceClass()) result.referenceClass = target;
+    if (auto* scalar = std::get_if<CimScalar>(&result.value.data)) {
+        if (auto* path = std::get_if<CimPath>(scalar)) path->completeNamespace(namespaceName);
+    }
+    return result;
+}
+
 /// The key properties of a class, the nearest declaration of each.
 std::vector<PropertyDeclaration> keysOf(const ClassChain& chain) {
     std::vector<PropertyDeclaration> keys;
+    // From the class to the root, so that a reference that a subclass narrows counts as narrowed.
     for (const auto& declaration : chain) {
         for (const PropertyDeclaration& property : declaration->properties) {
-            const bool known = std::any_of(
-                keys.begin(), keys.end(), [&](const auto& key) { return sameName(key.name, property.name); });
-            if (property.isKey && !known) keys.push_back(property);
+            if (property.isKey && findByName(keys, property.name) == nullptr) keys.push_back(property);
         }
     }
     return keys;
@@ -30,6 +40,7 @@ CimPath typedReference(const CimPath& path, const ClassLookup& classes);
 
 CimScalar typedKey(const PropertyDeclaration& declared, const CimScalar& value, const ClassLookup& classes) {
     const auto* text = std::get_if<std::string>(&value);
+    // A text is parsed, not converted: a command line and some clients know no types, and write 5 as "5".
     const auto typed =
         text != nullptr ? parseScalar(declared.type, *text) : convertScalar(declared.type, value);
     if (!typed) {
@@ -49,14 +60,11 @@ CimPath typedKeys(const CimPath& path, const ClassChain& chain, const ClassLooku
     }
     std::vector<CimKey> keys;
     for (const CimKey& key : path.getKeys()) {
-        const auto found = std::find_if(declared.begin(), declared.end(), [&](const auto& each) {
-            return sameName(each.name, key.name) || (key.name.empty() && declared.size() == 1);
-        });
-        if (found == declared.end()) refuse(className + " has no key " + key.name);
-        if (std::any_of(keys.begin(), keys.end(),
-                        [&](const CimKey& seen) { return seen.name == found->name; })) {
-            refuse("key " + found->name + " is given twice");
-        }
+        // CIM-XML lets a class's one key come without its name (DSP0201, KEYVALUE without KEYBINDING).
+        const bool isOnlyKey = key.name.empty() && declared.size() == 1;
+        const PropertyDeclaration* found = isOnlyKey ? &declared.front() : findByName(declared, key.name);
+        if (found == nullptr) refuse(className + " has no key " + key.name);
+        if (findByName(keys, found->name) != nullptr) refuse("key " + found->name + " is given twice");
         keys.push_back({found->name, typedKey(*found, key.value, classes)});
     }
     CimPath typed(className, std::move(keys));
@@ -92,8 +100,11 @@ Kind kindOf(CimType type) {
             return Kind::Datetime;
         case CimType::Reference:
             return Kind::Reference;
+        case CimType::Real32:
+        case CimType::Real64:
+            return Kind::Real;
         default:
-            return isReal(type) ? Kind::Real : Kind::Integer;
+            return Kind::Integer;
     }
 }
 
@@ -124,6 +135,32 @@ std::optional<CimValue> typedValue(const ParameterDeclaration& declared, const A
 
 }  // namespace
 
+CimOperations::~CimOperations() = default;
+
+const PropertyValue* InstanceValue::find(std::string_view name) const {
+    return findByName(properties, name);
+}
+
+bool isWanted(const PropertyFilter& filter, std::string_view name) {
+    return !filter || std::any_of(filter->begin(), filter->end(),
+                                  [&](const std::string& wanted) { return sameName(wanted, name); });
+}
+
+InstanceValue readInstance(CimInstance& instance, CimPath path, const PropertyFilter& filter,
+                           const std::string& namespaceName) {
+    InstanceValue result{std::move(path), {}};
+    result.path.completeNamespace(namespaceName);
+    // One lock around all properties: a refresh on another thread shows whole or not at all.
+    const RecursiveLocker lock(instance.getMutex());
+    const std::vector<CimProperty*> properties = instance.getProperties();
+    result.properties.reserve(properties.size());
+    for (const CimProperty* property : properties) {
+        if (isWanted(filter, property->getName()))
+            result.properties.push_back(readProperty(*property, namespaceName));
+    }
+    return result;
+}
+
 CimPath typedPath(const CimPath& path, const ClassLookup& classes) {
     if (!path.isValid()) {
         refuse("'" + path.toString() + "' is not an object path; write one as namespace:Class.Key=\"value\"");
@@ -136,25 +173,16 @@ CimPath typedPath(const CimPath& path, const ClassLookup& classes) {
 }
 
 const Argument* findArgument(const std::vector<Argument>& arguments, std::string_view name) {
-    const auto found = std::find_if(arguments.begin(), arguments.end(),
-                                    [&](const Argument& argument) { return sameName(argument.name, name); });
-    return found == arguments.end() ? nullptr : &*found;
+    return findByName(arguments, name);
 }
 
-/// The arguments with their declared names and types.
 std::vector<Argument> typedArguments(const MethodDeclaration& method, const std::vector<Argument>& arguments,
                                      const ClassLookup& classes) {
     std::vector<Argument> result;
     for (const Argument& given : arguments) {
-        const auto declared =
-            std::find_if(method.parameters.begin(), method.parameters.end(),
-                         [&](const auto& parameter) { return sameName(parameter.name, given.name); });
-        if (declared == method.parameters.end()) {
-            refuse(method.name + " has no parameter " + given.name);
-        }
-        if (findArgument(result, declared->name) != nullptr) {
-            refuse(declared->name + " is given twice");
-        }
+        const ParameterDeclaration* declared = findByName(method.parameters, given.name);
+        if (declared == nullptr) refuse(method.name + " has no parameter " + given.name);
+        if (findArgument(result, declared->name) != nullptr) refuse(declared->name + " is given twice");
         auto value = typedValue(*declared, given, classes);
         if (!value) {
             refuse("parameter " + declared->name + " takes a value of type " +

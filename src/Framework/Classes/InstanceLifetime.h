@@ -6,10 +6,13 @@
 
 #include "Utils/Export.h"
 
+/// How long instances live: at least as long as the requests that have met them, and until the reaper has
+/// destroyed them.
 namespace core {
 
-struct AgentRegistration;
 class AgentUse;
+class CimInstance;
+struct AgentRegistration;
 
 /// One request of a client, on the calling thread. Whatever is enumerated, looked up or added meanwhile on
 /// this thread stays alive until the scope ends, so plain pointers to instances are good that long. Every
@@ -34,5 +37,21 @@ class QUENX_EXPORT RequestScope {
     std::vector<std::shared_ptr<const void>> m_held;
     std::vector<AgentUse> m_agents;
 };
+
+/// The deleter of listed instances: destroys one that nobody holds any more, at once, or on the reaper's
+/// thread when the instance's destructor waits. Never fails and never waits; where that thread cannot be had,
+/// the instance stays queued until the next one comes, or drainReaper().
+struct InstanceRelease {
+    void operator()(CimInstance* instance) const noexcept;
+};
+
+/// Makes sure that the reaper is built, and so destroyed after the object that is being built now.
+void prepareReaper();
+
+/// Returns when every instance that was queued is destroyed, code of its library included.
+QUENX_EXPORT void drainReaper() noexcept;
+
+/// Whether the thread still has instances to destroy.
+QUENX_EXPORT bool isReaperBusy() noexcept;
 
 }  // namespace core

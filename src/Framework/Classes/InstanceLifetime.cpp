@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "Framework/Classes/InstanceReaper.h"
+#include "Framework/Classes/InstanceLifetime.h"
 
 #include <condition_variable>
 #include <cstdint>
@@ -7,9 +7,46 @@
 #include <mutex>
 #include <thread>
 
+#include "Framework/Classes/CimBroker.h"
 #include "Framework/Model/CimInstance.h"
 
 namespace core {
+
+namespace {
+
+thread_local RequestScope* currentScope = nullptr;
+
+}  // namespace
+
+RequestScope::RequestScope() : m_outermost(currentScope == nullptr) {
+    if (m_outermost) currentScope = this;
+}
+
+RequestScope::~RequestScope() {
+    if (!m_outermost) return;
+    currentScope = nullptr;
+    // Instances go before their agents may.
+    m_held.clear();
+    m_agents.clear();
+}
+
+RequestScope* RequestScope::current() {
+    return currentScope;
+}
+
+void RequestScope::hold(std::shared_ptr<const void> object) {
+    // The same snapshot is often taken several times in a row.
+    if (!m_held.empty() && m_held.back() == object) return;
+    m_held.push_back(std::move(object));
+}
+
+void RequestScope::hold(const std::shared_ptr<AgentRegistration>& registration) {
+    // A request looks at the agents many times; a process has two or three of them.
+    for (const AgentUse& use : m_agents) {
+        if (use.uses(registration)) return;
+    }
+    m_agents.emplace_back(registration);
+}
 
 /// The queue of instances to destroy, and the one thread that destroys them. The queue is linked through the
 /// instances, so that queueing one never needs memory.
@@ -29,13 +66,13 @@ class InstanceReaper {
         if (m_thread.joinable()) m_thread.join();
     }
 
+    /// Destroyed at the end of the process, after whatever was built after prepareReaper().
     static InstanceReaper& theOne() {
         static InstanceReaper reaper;
         return reaper;
     }
 
-    static bool waits(const CimInstance* instance) { return instance->m_destructionWaits; }
-
+    /// A thread that was refused is asked for again: the daemon calls this until everything is destroyed.
     bool isWorking() noexcept {
         const std::lock_guard lock(m_mutex);
         return (m_first != nullptr && startThread()) || m_busy;
@@ -52,6 +89,7 @@ class InstanceReaper {
 
     void drain() noexcept {
         std::unique_lock lock(m_mutex);
+        // Without a thread the caller does the work, since it must not go on before it is done.
         if (m_first != nullptr && !startThread()) destroyQueued(lock);
         m_changed.wait(lock, [this] { return m_first == nullptr && m_busy == 0; });
     }
@@ -89,6 +127,7 @@ class InstanceReaper {
             m_first = instance->m_nextToDestroy;
             if (m_first == nullptr) m_last = nullptr;
             ++m_busy;
+            // The destructor waits, for a flash, say; and it may release instances that end up here.
             lock.unlock();
             delete instance;
             lock.lock();
@@ -106,9 +145,8 @@ class InstanceReaper {
     bool m_ending = false;
 };
 
-void destroyInstance(CimInstance* instance) noexcept {
-    if (instance == nullptr) return;
-    if (InstanceReaper::waits(instance)) {
+void InstanceRelease::operator()(CimInstance* instance) const noexcept {
+    if (instance != nullptr && instance->m_destructionWaits) {
         InstanceReaper::theOne().add(instance);
     } else {
         delete instance;
