@@ -101,44 +101,40 @@ CLI::Option* addImageOptions(CLI::App& verb, ImageOptions& options, const char* 
     return identity;
 }
 
-/// In the order in which the help lists them.
-void addVerbs(CLI::App& app, Arguments& arguments) {
-    VerbOptions& options = arguments.options;
-    const auto add = [&](const char* name, Verb verb, const char* description) {
-        CLI::App* added = app.add_subcommand(name, description);
-        // Run once the whole line has been read without a mistake.
-        added->callback([verb, &arguments] { arguments.verb = verb; });
-        return added;
-    };
-    add("adapters", showAdapters, "List the adapters and the firmware on them");
-    add("identities", showIdentities, "List the images that the inventory offers, and those installed");
+CLI::App* addVerb(CLI::App& app, Arguments& arguments, const char* name, Verb verb, const char* description) {
+    CLI::App* added = app.add_subcommand(name, description);
+    // Run once the whole line has been read without a mistake.
+    added->callback([verb, &arguments] { arguments.verb = verb; });
+    return added;
+}
 
-    CLI::App* verb =
-        add("check", check,
-            "Say whether an image could be installed, without writing it (a server may hold the adapter)");
-    CLI::Option* identity =
-        addImageOptions(*verb, options.image,
-                        "Image: a path or a file URI; with --server only one that \"identities\" lists");
-    verb->add_flag("--force", options.image.force, "Check whether it could be installed with --force")
+void addImageVerbs(CLI::App& app, Arguments& arguments) {
+    ImageOptions& options = arguments.options.image;
+    CLI::App* verb = addVerb(
+        app, arguments, "check", check,
+        "Say whether an image could be installed, without writing it (a server may hold the adapter)");
+    CLI::Option* identity = addImageOptions(
+        *verb, options, "Image: a path or a file URI; with --server only one that \"identities\" lists");
+    verb->add_flag("--force", options.force, "Check whether it could be installed with --force")
         ->excludes(identity);
     verb->footer("--types and --force cannot be used with --server.");
 
-    verb = add("install", install, "Install a firmware image on an adapter and wait until it is done");
+    verb = addVerb(app, arguments, "install", install,
+                   "Install a firmware image on an adapter and wait until it is done");
     verb->alias("update");
-    addImageOptions(*verb, options.image, "Image: a path or a file URI");
-    verb->add_flag("--force", options.image.force, "Also install an older image, or the same one again");
+    addImageOptions(*verb, options, "Image: a path or a file URI");
+    verb->add_flag("--force", options.force, "Also install an older image, or the same one again");
     verb->footer("An update that has begun always runs to its end: Ctrl-C does not stop it.");
+}
 
-    add("jobs", showJobs, "List the jobs on a server");
-    verb = add("delete", deleteJob, "Delete a job from the list of a server; its update continues");
-    addValue(*verb, "job", options.job, "JOB", "Job: its id as \"jobs\" lists it, or the number at its end")
-        ->required();
-
-    verb = add("instances", showInstances, "List the instances of a class");
+void addModelVerbs(CLI::App& app, Arguments& arguments) {
+    VerbOptions& options = arguments.options;
+    CLI::App* verb = addVerb(app, arguments, "instances", showInstances, "List the instances of a class");
     addValue(*verb, "class", options.className, "CLASS", "Class, for example Quenx_ConcreteJob")->required();
     verb->add_flag("--names", options.namesOnly, "Only their object paths");
 
-    verb = add("associators", showAssociators, "List the instances associated with an instance");
+    verb = addVerb(app, arguments, "associators", showAssociators,
+                   "List the instances associated with an instance");
     addValue(*verb, "path", options.path, "PATH", "Object path, as \"instances CLASS --names\" prints it")
         ->required();
     addValue(*verb, "--class", options.filter.associationClass, "CLASS",
@@ -148,7 +144,22 @@ void addVerbs(CLI::App& app, Arguments& arguments) {
     addValue(*verb, "--result-role", options.filter.resultRole, "ROLE", "Only instances with this role");
     verb->add_flag("--names", options.namesOnly, "Only their object paths");
 
-    add("mof", showMof, "Print the schema of all served classes as MOF");
+    addVerb(app, arguments, "mof", showMof, "Print the schema of all served classes as MOF");
+}
+
+/// In the order in which the help lists them.
+void addVerbs(CLI::App& app, Arguments& arguments) {
+    addVerb(app, arguments, "adapters", showAdapters, "List the adapters and the firmware on them");
+    addVerb(app, arguments, "identities", showIdentities,
+            "List the images that the inventory offers, and those installed");
+    addImageVerbs(app, arguments);
+    addVerb(app, arguments, "jobs", showJobs, "List the jobs on a server");
+    CLI::App* verb = addVerb(app, arguments, "delete", deleteJob,
+                             "Delete a job from the list of a server; its update continues");
+    addValue(*verb, "job", arguments.options.job, "JOB",
+             "Job: its id as \"jobs\" lists it, or the number at its end")
+        ->required();
+    addModelVerbs(app, arguments);
 }
 
 constexpr const char* kAskHelp = "\"quenxctl --help\" lists the verbs and options.";
@@ -243,6 +254,15 @@ CommandError wrongUse(const CLI::App& app, const CLI::ParseError& error) {
                         : unknownVerb(app, rest.front());
 }
 
+/// The library can exclude one option by another, but not require one of two.
+void requireOneImage(const CLI::App& app, const Arguments& arguments) {
+    const ImageOptions& image = arguments.options.image;
+    const bool takesImage = arguments.verb == install || arguments.verb == check;
+    if (!takesImage || image.image.empty() != image.identity.empty()) return;
+    throw CommandError(ExitStatus::WrongUse, "Name one image, either as a file or with --identity.",
+                       askHelpOf(*app.get_subcommands().front()));
+}
+
 /// Prints the help of the program, or with a name that of a verb.
 void printHelp(const CLI::App& app, const std::string& name) {
     // Not App::help(): once a verb was read, that gives the help of the verb.
@@ -289,13 +309,7 @@ std::optional<Arguments> readArguments(int argc, char** argv) {
         printHelp(app, helpOf);
         return std::nullopt;
     }
-    // The library can exclude one option by another, but not require one of two.
-    const ImageOptions& image = arguments.options.image;
-    const bool takesImage = arguments.verb == install || arguments.verb == check;
-    if (takesImage && image.image.empty() == image.identity.empty()) {
-        throw CommandError(ExitStatus::WrongUse, "Name one image, either as a file or with --identity.",
-                           askHelpOf(*app.get_subcommands().front()));
-    }
+    requireOneImage(app, arguments);
     return arguments;
 }
 
