@@ -21,6 +21,7 @@ InstanceBody readNamedInstance(const pugi::xml_node& element) {
     if (parts.size() != 2) refuseElement(element, "must hold INSTANCENAME and INSTANCE");
     expectElement(parts[0], "INSTANCENAME");
     expectElement(parts[1], "INSTANCE");
+    // A name without a namespace: a modification names its instance within the namespace of the call.
     InstanceBody body = readInstanceBody(parts[1]);
     body.path = readObject(parts[0], KeyTyping::Text).path;
     return body;

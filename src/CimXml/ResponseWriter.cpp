@@ -51,30 +51,17 @@ struct ResultWriter {
     const std::string& host;
 
     void write(const core::InstanceValue& instance) const {
-        if (result.kind == ResultKind::Instance) {
-            writeInstance(writer, instance, result.origins.get());
-            return;
-        }
-        const std::string_view element = resultElement(result.kind);
-        writer.open(element);
-        // Only an enumeration answers for one namespace and host, which the client knows already.
-        if (result.kind == ResultKind::NamedInstances) {
-            writeInstanceName(writer, instance.path);
-        } else {
-            writeInstancePath(writer, instance.path, host);
-        }
+        const bool hasPath = result.kind != ResultKind::Instance;
+        if (hasPath) writer.open(resultElement(result.kind));
+        if (hasPath) writePath(instance.path);
         writeInstance(writer, instance, result.origins.get());
-        writer.end(element);
+        if (hasPath) writer.end(resultElement(result.kind));
     }
 
     void write(const core::CimPath& path) const {
         const bool isObjectPath = result.kind == ResultKind::ObjectPaths;
         if (isObjectPath) writer.open("OBJECTPATH");
-        if (result.kind == ResultKind::InstanceNames) {
-            writeInstanceName(writer, path);
-        } else {
-            writeInstancePath(writer, path, host);
-        }
+        writePath(path);
         if (isObjectPath) writer.end("OBJECTPATH");
     }
 
@@ -82,6 +69,16 @@ struct ResultWriter {
     void write(const std::string& className) const { writeClassName(writer, className); }
     void write(const core::QualifierDeclaration& declaration) const {
         writeQualifierDeclaration(writer, declaration);
+    }
+
+  private:
+    /// Only an enumeration answers for one namespace and host, which the client knows already.
+    void writePath(const core::CimPath& path) const {
+        if (result.kind == ResultKind::NamedInstances || result.kind == ResultKind::InstanceNames) {
+            writeInstanceName(writer, path);
+        } else {
+            writeInstancePath(writer, path, host);
+        }
     }
 };
 

@@ -28,6 +28,8 @@ struct GivenOption {
     std::vector<std::string> texts;
 };
 
+/// Options are taken as texts: CLI11 would say in its own words what is wrong with a number, while the file's
+/// mistakes are told in ours.
 void addOptions(CLI::App& app, std::vector<GivenOption>& given) {
     for (GivenOption& each : given) {
         const std::string help = each.field.help + " [" + each.field.text() + "]";
@@ -129,6 +131,7 @@ CommandLine readCommandLine(int argc, const char* const* argv) {
     try {
         app.parse(argc, argv);
         if (passwdCommand->parsed()) checkPasswd(passwd, result.checkOnly);
+        // The file in between: the command line names it, and overrides what it says.
         readFile(file, result.settings);
         applyOptions(given);
         checkSettings(result.settings);

@@ -94,6 +94,7 @@ int checkConfiguration(const Settings& settings) {
         }
     };
     const ListenSettings& listen = settings.listen;
+    // First, since a daemon that runs already excuses its ports.
     bool isRunning = false;
     check([&] { isRunning = isDaemonRunning(settings.lockFile); });
     if (listen.https) check([&] { checkPort(listen.address, listen.httpsPort, isRunning); });

@@ -120,6 +120,7 @@ std::unique_ptr<Dispatcher> Daemon::makeDispatcher() const {
 
 std::unique_ptr<Authentication> Daemon::makeAuthentication() const {
     const AuthenticationSettings& settings = m_settings.authentication;
+    // A users file is read at once: a daemon that nobody can log in to should not start.
     std::unique_ptr<PasswordChecker> checker;
     if (settings.method == "users") {
         checker = std::make_unique<UsersFile>(settings.usersFile);
@@ -146,6 +147,7 @@ void Daemon::readCertificate() {
 
 void Daemon::listen() {
     if (m_settings.listen.https) {
+        // Encrypted from the first start on, though clients have to be told to trust the certificate.
         if (makeTlsFiles(m_settings.tls)) {
             report("Made a self-signed certificate for " + os::getHostname() +
                    ", localhost, 127.0.0.1 and ::1: " + m_settings.tls.certificate);

@@ -29,6 +29,7 @@ std::string ask(const char* prompt) {
 }
 
 std::string newPassword() {
+    // A script writes it once; only people mistype.
     if (::isatty(STDIN_FILENO) == 0) return readLine();
     // Asked twice, since nobody sees what he types.
     std::string password = ask("New password: ");

@@ -72,8 +72,8 @@ std::string SettingsField::text() const {
         target);
 }
 
-// The help texts stand here and not in the header: they are what `quenx-cimd --help` prints. Bounds keep a
-// slip of the finger from taking the daemon's memory or from closing every connection at once.
+// The texts are what `quenx-cimd --help` prints. The bounds keep one zero too many from using up the memory,
+// and one too few from refusing every client.
 std::vector<SettingsField> fieldsOf(Settings& s) {
     return {{"listen.address", &s.listen.address, 0, 0, "address to listen on"},
             {"listen.https", &s.listen.https, 0, 0, "serve HTTPS"},

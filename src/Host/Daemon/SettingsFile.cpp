@@ -83,6 +83,7 @@ toml::table parse(const std::string& file) {
 }  // namespace
 
 void readSettingsFile(const std::string& file, Settings& settings) {
+    // Every key that is there is looked up, not every setting: so a misspelt key is noticed.
     const toml::table table = parse(file);
     const std::vector<SettingsField> fields = fieldsOf(settings);
     for (const auto& [section, content] : table) {

@@ -84,6 +84,7 @@ ClassDeclaration completeClass(const core::ClassChain& chain) {
             addElement(whole.methods, method, declaration.name);
         whole.name = declaration.name;
         whole.superclass = declaration.superclass;
+        // A subclass of an association is one, whether it says so or not.
         whole.isAssociation |= declaration.isAssociation;
         whole.qualifiers = core::mergeQualifiers(declaration.qualifiers, whole.qualifiers);
     }

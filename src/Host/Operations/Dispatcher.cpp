@@ -73,6 +73,7 @@ cimxml::Response Dispatcher::dispatch(const cimxml::Request& request, const Call
         // Most of what the request took is free again, so the small answer fits.
         response.content = ErrorResult{CimStatus::Failed, "out of memory"};
     } catch (const std::exception& error) {
+        // A provider's fault is the answer to this request alone; the connection and the daemon go on.
         response.content = ErrorResult{CimStatus::Failed, error.what()};
     }
     return response;

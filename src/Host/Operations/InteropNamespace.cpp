@@ -169,6 +169,7 @@ core::MethodResult InteropNamespace::invokeMethod(const CimPath& path, const std
 }
 
 void InteropNamespace::deleteInstance(const CimPath& path) {
+    // A client that is wrong about the instance hears that first.
     getInstance(path, kNoProperties);
     throw core::CimError(core::CimStatus::NotSupported,
                          "instances of " + path.getClassName() + " cannot be deleted");

@@ -73,6 +73,8 @@ std::chrono::seconds OpenEnumerations::checkedTimeout(std::optional<std::uint32_
 }
 
 void OpenEnumerations::dropExpired() {
+    // Whenever somebody comes by: with a limit on their number, expired ones need no thread that removes
+    // them.
     std::erase_if(m_entries, [now = Clock::now()](const auto& each) { return each.second.expires <= now; });
 }
 

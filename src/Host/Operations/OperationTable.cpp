@@ -53,7 +53,7 @@ std::size_t countOf(const Parameters& parameters) {
 }
 
 /// Enumerates as the handler does; the objects go out in pieces, in the form of the kind.
-template <OperationHandler handler, ResultKind kind>
+template <OperationHandler Handler, ResultKind Form>
 IntrinsicResult open(const OperationContext& context, const Parameters& parameters) {
     if (parameters.isGiven("FilterQueryLanguage") || parameters.isGiven("FilterQuery"))
         throw CimError(CimStatus::FilteredEnumerationNotSupported, "enumerations are not filtered");
@@ -61,15 +61,15 @@ IntrinsicResult open(const OperationContext& context, const Parameters& paramete
         throw CimError(CimStatus::ContinuationOnErrorNotSupported,
                        "an enumeration ends with its first error");
     }
-    IntrinsicResult result = handler(context, parameters);
-    result.kind = kind;
+    IntrinsicResult result = Handler(context, parameters);
+    result.kind = Form;
     return context.enumerations.open(ownerOf(context), std::move(result), countOf(parameters),
                                      parameters.number("OperationTimeout"));
 }
 
-template <ResultKind kind>
+template <ResultKind Form>
 IntrinsicResult pull(const OperationContext& context, const Parameters& parameters) {
-    return context.enumerations.pull(ownerOf(context), kind, parameters.text(kContext.name),
+    return context.enumerations.pull(ownerOf(context), Form, parameters.text(kContext.name),
                                      countOf(parameters));
 }
 
@@ -78,6 +78,7 @@ IntrinsicResult close(const OperationContext& context, const Parameters& paramet
     return {};
 }
 
+/// Served only to be refused: its own status tells a client more than "not supported" would.
 IntrinsicResult refuseQuery(const OperationContext&, const Parameters& parameters) {
     throw CimError(CimStatus::QueryLanguageNotSupported,
                    "queries in " + parameters.text("QueryLanguage") + " are not supported");

@@ -76,6 +76,7 @@ const ParameterValue* Parameters::find(std::string_view name) const {
 bool Parameters::flag(std::string_view name, bool otherwise) const {
     const ParameterValue* value = find(name);
     if (value == nullptr) return otherwise;
+    // That it can be read was seen when the call was checked.
     return std::get<bool>(*core::parseScalar(CimType::Boolean, std::get<std::string>(*value)));
 }
 

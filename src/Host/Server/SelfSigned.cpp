@@ -30,11 +30,11 @@ void check(int status) {
         throw std::runtime_error(std::string("Cannot make a certificate: ") + ::gnutls_strerror(status));
 }
 
-template <auto close>
+template <auto Close>
 struct Closer {
     template <class Handle>
     void operator()(Handle handle) const {
-        close(handle);
+        Close(handle);
     }
 };
 using Key =
@@ -46,6 +46,7 @@ Key makeKey() {
     gnutls_x509_privkey_t raw = nullptr;
     check(::gnutls_x509_privkey_init(&raw));
     Key key(raw);
+    // Made in a moment, unlike a key of RSA, and known to every client of TLS 1.2.
     check(::gnutls_x509_privkey_generate(raw, GNUTLS_PK_ECDSA,
                                          GNUTLS_CURVE_TO_BITS(GNUTLS_ECC_CURVE_SECP256R1), 0));
     return key;

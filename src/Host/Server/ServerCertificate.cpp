@@ -83,6 +83,7 @@ void ServerCertificate::readKey(const std::string& file) {
 }
 
 void ServerCertificate::checkPair(const std::string& certificateFile, const std::string& keyFile) const {
+    // GnuTLS itself would find out in the first handshake, and could tell nobody but the client.
     gnutls_pubkey_t own = nullptr;
     check(::gnutls_pubkey_init(&own), keyFile);
     const std::unique_ptr<std::remove_pointer_t<gnutls_pubkey_t>, decltype(&::gnutls_pubkey_deinit)> holder(
