@@ -23,7 +23,9 @@ constexpr const char* kFooter =
     "  1  failed or refused: the message says what happened, and what to do next where that helps\n"
     "  2  wrong use: the command line itself is wrong, or a file that an option names cannot be used\n"
     "  3  already current: what was to be installed is what is installed (see --force)\n"
-    "  4  not found: there is no such adapter, image file, identity, job, class or instance\n";
+    "  4  not found: there is no such adapter, image file, identity, job, class or instance\n"
+    "  5  unknown: the update may have begun, or may still be running; the message says where to look\n"
+    "  6  interrupted: before the update began, or while a server goes on with it; the message says which\n";
 
 /// An option, or without dashes an argument, that takes one value.
 CLI::Option* addValue(CLI::App& app, const char* name, std::string& value, const char* type,

@@ -23,7 +23,8 @@ std::atomic<bool> interruptionAsked{false};
 static_assert(std::atomic<bool>::is_always_lock_free, "a signal handler stores it");
 
 /// From here on, Ctrl-C, SIGTERM and a closed terminal do not end the program but are noted, and writing into
-/// a closed pipe is an error and no signal: a program that ends takes the running update with it.
+/// a closed pipe is an error and no signal: a program that ends takes an update of its own with it, and is to
+/// say of a server's that it goes on.
 void noteInterruptions() {
     struct sigaction action = {};
     action.sa_handler = [](int) { interruptionAsked = true; };
@@ -85,14 +86,19 @@ ExitStatus runVerb(const Arguments& arguments) {
     LinePrinter printer(arguments.json ? std::cerr : std::cout,
                         Terminal::of(arguments.json ? STDERR_FILENO : STDOUT_FILENO));
     ProgressDisplay progress(printer);
-    const Connection connection =
-        arguments.server.url ? openServer(arguments.server) : openProviders(arguments.providers);
+    const Connection connection = arguments.server.url
+                                      ? openServer(arguments.server, [] { return interruptionAsked.load(); })
+                                      : openProviders(arguments.providers);
     // After a prompt for the password, at which Ctrl-C is to end the program.
     if (arguments.startsUpdate()) noteInterruptions();
     // A look costs a server a request, and this process nothing.
     const std::chrono::milliseconds pause(connection.runsJobs ? 50 : 500);
     const Following following = {[pause] { std::this_thread::sleep_for(pause); },
-                                 [] { return interruptionAsked.exchange(false); }};
+                                 [untilTheEnd = connection.runsJobs] {
+                                     return untilTheEnd ? interruptionAsked.exchange(false)
+                                                        : interruptionAsked.load();
+                                 },
+                                 connection.runsJobs};
     Context context{connection, std::cout, std::cerr, arguments.json, progress, following};
     return arguments.verb(context, arguments.options);
 }

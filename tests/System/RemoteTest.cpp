@@ -82,6 +82,33 @@ TEST_F(RemoteTest, SaysWhoHoldsTheAdapters) {
                 "or another adapter than eth1 is in use: an earlier check may hold it, or ");
 }
 
+TEST_F(RemoteTest, LeavesAnUpdateToTheServerWhenInterrupted) {
+    test::HeldFlash held(m_daemon.folder() / "state/eth0");
+    Program first(command(trusting("install --target eth0 IMAGE")), Program::Output::Pipes,
+                  {"QUENXCTL_PASSWORD=admin"});
+    ASSERT_TRUE(first.waitFor("eth0: 0 %"));
+    first.send(SIGINT);
+    const ProgramResult left = first.finish();
+    EXPECT_EQ(left.status, 6);
+    EXPECT_EQ(left.error,
+              "quenxctl: Interrupted. The update of eth0 goes on on the server.\n"
+              "\"quenxctl jobs\" shows how far it is.\n");
+    // A server that hangs must not hold its user either.
+    m_daemon.program().send(SIGSTOP);
+    Program second(command(trusting("install --target eth0 IMAGE")), Program::Output::Terminal,
+                   {"QUENXCTL_PASSWORD=admin"});
+    std::this_thread::sleep_for(std::chrono::milliseconds(300));
+    second.send(SIGTERM);
+    const ProgramResult hung = second.finish();
+    m_daemon.program().send(SIGCONT);
+    // The signal may have come before the program was ready for it.
+    if (hung.status != -SIGTERM) {
+        EXPECT_EQ(hung.status, 6);
+        EXPECT_TRUE(contains(hung.out, "Interrupted before the update began: nothing was changed."))
+            << hung.out;
+    }
+}
+
 /// The lines, whatever their order.
 std::multiset<std::string> linesOf(const std::string& text) {
     std::multiset<std::string> lines;
@@ -117,7 +144,7 @@ TEST_F(RemoteTest, AnswersOperationsThatNoVerbNeeds) {
     cli::ServerSettings settings;
     settings.url.emplace("http://127.0.0.1:" + std::to_string(m_daemon.httpPort()));
     settings.user = "admin";
-    const cli::Connection connection = cli::openServer(settings);
+    const cli::Connection connection = cli::openServer(settings, [] { return false; });
     core::CimOperations& server = *connection.operations;
     const core::CimPath port = server.enumerateInstanceNames("Quenx_EthernetPort").at(0);
     const core::AssociationFilter byFirmware{"Quenx_ElementSoftwareIdentity", "", "", ""};

@@ -1,13 +1,21 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include <functional>
 #include <memory>
 #include <optional>
 #include <string>
 
+#include "Cli/Display/Messages.h"
 #include "Framework/Requests/CimOperations.h"
 
 namespace cli {
+
+/// A request without a usable answer that the server may have carried out all the same.
+class NoAnswer : public CommandError {
+  public:
+    using CommandError::CommandError;
+};
 
 /// The way to the management model: in this process, or over the wire. Used from one thread.
 struct Connection {
@@ -60,7 +68,10 @@ struct ServerSettings {
 /// Prepares requests to any WBEM server that serves these classes, over CIM-XML; nothing is sent yet. Warns
 /// on standard error of what gives the password away. The password is QUENXCTL_PASSWORD, else asked for on
 /// the terminal. Throws CommandError where nobody can answer.
-/// @param settings  with a URL
-Connection openServer(const ServerSettings& settings);
+/// @param settings       with a URL
+/// @param isInterrupted  asked about once a second while an answer is waited for; true gives the request up
+/// by
+///                       a CommandError with ExitStatus::Interrupted
+Connection openServer(const ServerSettings& settings, std::function<bool()> isInterrupted);
 
 }  // namespace cli

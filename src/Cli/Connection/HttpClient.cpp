@@ -45,6 +45,10 @@ std::size_t takeBody(char* data, std::size_t, std::size_t count, void* to) {
     return count;
 }
 
+int stopIfInterrupted(void* isInterrupted, curl_off_t, curl_off_t, curl_off_t, curl_off_t) {
+    return (*static_cast<std::function<bool()>*>(isInterrupted))() ? 1 : 0;
+}
+
 std::size_t takeHeader(char* data, std::size_t, std::size_t count, void* to) {
     auto& reply = *static_cast<HttpReply*>(to);
     const std::string_view line(data, count);
@@ -104,10 +108,12 @@ ServerUrl::ServerUrl(const std::string& text) {
     m_text = partOf(url, CURLUPART_URL);
 }
 
-HttpClient::HttpClient(const ServerSettings& settings, const std::string& user, const std::string& password)
+HttpClient::HttpClient(const ServerSettings& settings, const std::string& user, const std::string& password,
+                       std::function<bool()> isInterrupted)
     : m_curl(curl_easy_init(), curl_easy_cleanup),
       m_url(settings.url->text()),
-      m_namesCaFile(!settings.caFile.empty()) {
+      m_namesCaFile(!settings.caFile.empty()),
+      m_isInterrupted(std::move(isInterrupted)) {
     if (m_curl == nullptr) {
         throw CommandError(ExitStatus::Failed, "Cannot start the HTTP library.",
                            "Free some memory and try again.");
@@ -123,6 +129,9 @@ HttpClient::HttpClient(const ServerSettings& settings, const std::string& user, 
     set(CURLOPT_TIMEOUT, kAnswerSeconds);
     set(CURLOPT_WRITEFUNCTION, &takeBody);
     set(CURLOPT_HEADERFUNCTION, &takeHeader);
+    set(CURLOPT_NOPROGRESS, 0L);
+    set(CURLOPT_XFERINFODATA, &m_isInterrupted);
+    set(CURLOPT_XFERINFOFUNCTION, &stopIfInterrupted);
     // The one scheme that every WBEM server has. Naming it saves a first request that would be refused.
     set(CURLOPT_HTTPAUTH, CURLAUTH_BASIC);
     set(CURLOPT_USERNAME, user.c_str());
@@ -157,10 +166,19 @@ HttpReply HttpClient::post(const std::vector<std::string>& headers, const std::s
 void HttpClient::refuse(CURLcode code) const {
     // Without --cacert it is the system that has no certificates, so the user did not name a bad file.
     if (code == CURLE_SSL_CACERT_BADFILE && !m_namesCaFile) code = CURLE_PEER_FAILED_VERIFICATION;
+    long sent = 0;
+    curl_easy_getinfo(m_curl.get(), CURLINFO_REQUEST_SIZE, &sent);
+    if (code == CURLE_ABORTED_BY_CALLBACK) {
+        const std::string what = "Interrupted while waiting for the server.";
+        if (sent > 0) throw NoAnswer(ExitStatus::Interrupted, what, "");
+        throw CommandError(ExitStatus::Interrupted, what, "");
+    }
     const std::string reason = m_error.front() == '\0' ? curl_easy_strerror(code) : m_error.data();
-    throw CommandError(code == CURLE_SSL_CACERT_BADFILE ? ExitStatus::WrongUse : ExitStatus::Failed,
-                       "The request to " + m_url + " failed: " + reason + ".",
-                       adviceFor(code, m_url.starts_with("https:")));
+    const std::string what = "The request to " + m_url + " failed: " + reason + ".";
+    const std::string advice = adviceFor(code, m_url.starts_with("https:"));
+    if (sent > 0) throw NoAnswer(ExitStatus::Failed, what, advice);
+    throw CommandError(code == CURLE_SSL_CACERT_BADFILE ? ExitStatus::WrongUse : ExitStatus::Failed, what,
+                       advice);
 }
 
 }  // namespace cli

@@ -4,6 +4,7 @@
 #include <curl/curl.h>
 
 #include <array>
+#include <functional>
 #include <memory>
 #include <string>
 #include <vector>
@@ -22,11 +23,13 @@ struct HttpReply {
 /// Requests to one server over one connection. Used from one thread.
 class HttpClient {
   public:
-    HttpClient(const ServerSettings& settings, const std::string& user, const std::string& password);
+    HttpClient(const ServerSettings& settings, const std::string& user, const std::string& password,
+               std::function<bool()> isInterrupted);
     HttpClient(const HttpClient&) = delete;
     HttpClient& operator=(const HttpClient&) = delete;
 
-    /// Sends a body of XML. Throws CommandError when there is no answer.
+    /// Sends a body of XML. Throws CommandError when it could not be sent, NoAnswer when only the answer is
+    /// missing.
     HttpReply post(const std::vector<std::string>& headers, const std::string& body);
 
   private:
@@ -40,6 +43,7 @@ class HttpClient {
     std::array<char, CURL_ERROR_SIZE> m_error{};
     std::string m_url;
     bool m_namesCaFile;
+    std::function<bool()> m_isInterrupted;
 };
 
 }  // namespace cli

@@ -77,18 +77,18 @@ void requireOk(const HttpReply& reply) {
                 "passwords.",
                 "Try again in " + wait + ".");
         default:
-            throw CommandError(
-                ExitStatus::Failed,
-                "The server answered with HTTP status " + std::to_string(reply.status) + why + ".",
-                "Check that --server names a CIM-XML server; its log has the details.");
+            throw NoAnswer(ExitStatus::Failed,
+                           "The server answered with HTTP status " + std::to_string(reply.status) + why + ".",
+                           "Check that --server names a CIM-XML server; its log has the details.");
     }
 }
 
 /// What a server answers over CIM-XML.
 class RemoteOperations : public core::CimOperations {
   public:
-    RemoteOperations(const ServerSettings& settings, const std::string& user, const std::string& password)
-        : m_client(settings, user, password), m_namespace(settings.namespaceName) {}
+    RemoteOperations(const ServerSettings& settings, const std::string& user, const std::string& password,
+                     std::function<bool()> isInterrupted)
+        : m_client(settings, user, password, std::move(isInterrupted)), m_namespace(settings.namespaceName) {}
 
     const std::string& getNamespace() const override { return m_namespace; }
 
@@ -159,9 +159,9 @@ cimxml::Response RemoteOperations::send(cimxml::Request request, const std::stri
             throw core::CimError(error->status, error->description);
         return response;
     } catch (const cimxml::WireError& error) {
-        throw CommandError(ExitStatus::Failed,
-                           std::string("The server's answer cannot be read: ") + error.what() + ".",
-                           "Check that --server names a CIM-XML server.");
+        throw NoAnswer(ExitStatus::Failed,
+                       std::string("The server's answer cannot be read: ") + error.what() + ".",
+                       "Check that --server names a CIM-XML server.");
     }
 }
 
@@ -261,7 +261,7 @@ std::string passwordOf(const std::string& user) {
 
 }  // namespace
 
-Connection openServer(const ServerSettings& settings) {
+Connection openServer(const ServerSettings& settings, std::function<bool()> isInterrupted) {
     if (!settings.url->isEncrypted() && !settings.url->isLoopback()) {
         std::cerr << "quenxctl: WARNING: http:// sends the password and everything else unencrypted. Use "
                      "https:// instead.\n";
@@ -272,7 +272,8 @@ Connection openServer(const ServerSettings& settings) {
     }
     const std::string user = settings.user.empty() ? userName() : settings.user;
     const std::string password = passwordOf(user);
-    return {std::make_shared<RemoteOperations>(settings, user, password), false, settings.url->isLoopback()};
+    return {std::make_shared<RemoteOperations>(settings, user, password, std::move(isInterrupted)), false,
+            settings.url->isLoopback()};
 }
 
 }  // namespace cli

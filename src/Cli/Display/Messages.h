@@ -16,6 +16,8 @@ enum class ExitStatus {
     WrongUse = 2,
     AlreadyCurrent = 3,  ///< what was to be installed is what is installed
     NotFound = 4,        ///< what the command line names is not there: an adapter, a job, an image file
+    Unknown = 5,         ///< whether an update began, or how it ended, cannot be told
+    Interrupted = 6,     ///< by the user; an update that a server has begun goes on
 };
 
 /// What happened and what to do next, each one or two sentences. The advice may be empty.

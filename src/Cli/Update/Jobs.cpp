@@ -50,28 +50,31 @@ JobView viewOf(const core::InstanceValue& job) {
 }
 
 JobView lookAt(core::CimOperations& operations, const core::CimPath& job, const Following& following) {
-    // The update goes on when a connection breaks, so several looks in a row may fail.
+    // A connection can break, or the server be busy, and the update goes on all the same: so many looks in a
+    // row may fail.
     constexpr unsigned kMostFailures = 20;
-    for (unsigned failures = 1;; ++failures) {
+    std::string reason;
+    for (unsigned failures = 0; failures < kMostFailures; ++failures) {
+        if (failures > 0) following.pause();
         try {
             return viewOf(operations.getInstance(job));
         } catch (const CommandError& error) {
-            if (failures == kMostFailures) {
-                throw CommandError(
-                    error.status(), error.what(),
-                    "The update may still be running: \"quenxctl jobs\" shows it. If the server was "
-                    "restarted, \"quenxctl adapters\" shows which firmware is there.");
-            }
+            if (error.status() == ExitStatus::Interrupted) throw;
+            reason = error.what();
         } catch (const core::CimError& error) {
-            if (error.status() != core::CimStatus::NotFound) throw;
-            throw CommandError(
-                ExitStatus::Failed,
-                "The server no longer knows the job: it was deleted, or the server was restarted. "
-                "How the update ends cannot be seen here.",
-                "\"quenxctl adapters\" shows which firmware is there.");
+            if (error.status() == core::CimStatus::NotFound) {
+                throw CommandError(
+                    ExitStatus::Unknown,
+                    "The server no longer knows the job: it was deleted, or the server was restarted. "
+                    "How the update ends cannot be seen here.",
+                    "\"quenxctl adapters\" shows which firmware is there.");
+            }
+            reason = std::string("The job cannot be read: ") + error.what() + ".";
         }
-        following.pause();
     }
+    throw CommandError(ExitStatus::Unknown, reason,
+                       "The update may still be running: \"quenxctl jobs\" shows it. If the server was "
+                       "restarted, \"quenxctl adapters\" shows which firmware is there.");
 }
 
 }  // namespace
@@ -113,21 +116,21 @@ std::vector<JobView> readJobs(core::CimOperations& operations) {
     return jobs;
 }
 
-JobView followJob(core::CimOperations& operations, const core::CimPath& job, ProgressDisplay& progress,
-                  const Following& following) {
+void followJob(core::CimOperations& operations, JobView& job, ProgressDisplay& progress,
+               const Following& following) {
     unsigned shown = 0;
     while (true) {
-        JobView view = lookAt(operations, job, following);
-        if (const auto percent = view.certainPercent()) {
+        job = lookAt(operations, core::CimPath(job.path), following);
+        if (const auto percent = job.certainPercent()) {
             // Progress that goes back, as after a retry on the device, would only puzzle.
             shown = std::max(shown, *percent);
             progress.progressed(shown);
         }
-        if (view.hasEnded()) {
-            progress.ended();
-            return view;
+        if (job.hasEnded()) return progress.ended();
+        if (following.interrupted()) {
+            if (!following.untilTheEnd) throw CommandError(ExitStatus::Interrupted, "Interrupted.", "");
+            progress.interrupted();
         }
-        if (following.interrupted()) progress.interrupted();
         following.pause();
     }
 }

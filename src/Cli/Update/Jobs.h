@@ -45,11 +45,14 @@ std::vector<JobView> readJobs(core::CimOperations& operations);
 struct Following {
     std::function<void()> pause;        ///< between two looks at the job
     std::function<bool()> interrupted;  ///< whether the user asked to stop since the last time
+    bool untilTheEnd = true;  ///< an interruption does not end it: the update would end with this program
 };
 
-/// Looks at the job until it has ended and shows its progress. Returns how it ended, without the adapter.
-/// Throws CommandError when the job cannot be looked at for long, or is gone.
-JobView followJob(core::CimOperations& operations, const core::CimPath& job, ProgressDisplay& progress,
-                  const Following& following);
+/// Looks at the job until it has ended and shows its progress.
+/// @param job  with the path; the rest is what the last look saw, without the adapter
+/// @throws CommandError  ExitStatus::Unknown when the job is gone or cannot be looked at for long, and
+///                       ExitStatus::Interrupted
+void followJob(core::CimOperations& operations, JobView& job, ProgressDisplay& progress,
+               const Following& following);
 
 }  // namespace cli

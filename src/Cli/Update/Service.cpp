@@ -11,13 +11,16 @@ namespace cli {
 
 namespace {
 
-core::CimPath findService(core::CimOperations& operations) {
+core::CimPath findService(core::CimOperations& operations) try {
     const auto services = operations.enumerateInstanceNames("Quenx_SoftwareInstallationService");
     if (services.empty()) {
         throw CommandError(ExitStatus::Failed, "There is no software installation service.",
                            "Check that the provider libraries are those of this version (--providers).");
     }
     return services.front();
+} catch (const NoAnswer& error) {
+    // Nobody shall take it for an update that may have begun.
+    throw CommandError(error.status(), error.what(), error.advice());
 }
 
 /// What the methods take as InstallOptions and InstallOptionsValues. The values are parallel to the codes,
@@ -72,7 +75,7 @@ core::CimPath jobOf(const core::MethodResult& result) {
         const auto* path = value == nullptr ? nullptr : std::get_if<core::CimPath>(value);
         if (path != nullptr && core::sameName(output.name, "Job")) return *path;
     }
-    throw CommandError(ExitStatus::Failed, "The service started an update but did not name its job.",
+    throw CommandError(ExitStatus::Unknown, "The service started an update but did not name its job.",
                        "\"quenxctl jobs\" lists the jobs of a server.");
 }
 

@@ -10,10 +10,11 @@
 namespace cli {
 
 /// Calls InstallFromURI, or InstallFromSoftwareIdentity for an image of the inventory; the identity itself
-/// says its types.
+/// says its types. Throws NoAnswer when the service was called and the update may have begun.
 core::MethodResult startUpdate(core::CimOperations& operations, const Candidate& candidate);
 
-/// The job among the outputs of startUpdate(). Throws CommandError when there is none.
+/// The job among the outputs of startUpdate(). Throws CommandError with ExitStatus::Unknown when there is
+/// none.
 core::CimPath jobOf(const core::MethodResult& result);
 
 /// Has the service verify the image as startUpdate() does, without installing it. Returns what the method

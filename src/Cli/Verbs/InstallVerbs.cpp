@@ -29,10 +29,10 @@ struct Outcome {
         advice = why.advice;
     }
     /// For a person: not found is a failure, already current is none.
-    bool isFailure() const { return status == ExitStatus::Failed || status == ExitStatus::NotFound; }
+    bool isFailure() const { return status != ExitStatus::Done && status != ExitStatus::AlreadyCurrent; }
 
     ExitStatus status = ExitStatus::Failed;
-    std::string result;   ///< "updated", "installable", "already current", "refused", "failed"
+    std::string result;   ///< "updated", "installable", "already current", "refused", "failed", "unknown"
     std::string message;  ///< what happened
     std::string advice;   ///< what to do next; may be empty
     std::string adapter;
@@ -134,16 +134,45 @@ std::vector<Component> readBack(core::CimOperations& operations, const Candidate
 void followUpdate(Context& context, const core::CimPath& job, const Candidate& candidate, Outcome& outcome) {
     core::CimOperations& operations = *context.connection.operations;
     context.progress.started(outcome.adapter, candidate.comparison ? candidate.comparison->bytes : 0);
-    outcome.job = followJob(operations, job, context.progress, context.following);
+    outcome.job.emplace().path = job;
+    try {
+        followJob(operations, *outcome.job, context.progress, context.following);
+    } catch (const CommandError& error) {
+        context.progress.ended();
+        outcome.after.clear();
+        if (error.status() == ExitStatus::Interrupted) {
+            outcome.end("unknown",
+                        {"Interrupted. The update of " + outcome.adapter + " goes on on the server.",
+                         "\"quenxctl jobs\" shows how far it is.", ExitStatus::Interrupted});
+        } else {
+            outcome.end("unknown", {error.what(), error.advice(), ExitStatus::Unknown});
+        }
+        return;
+    }
     outcome.job->adapter = outcome.adapter;
     outcome.after = readBack(operations, candidate);
     judgeJob(context.connection, outcome, candidate);
 }
 
-}  // namespace
+/// Nothing where the service was called and did not answer; the outcome then says so.
+std::optional<core::MethodResult> start(Context& context, const Candidate& candidate, Outcome& outcome) {
+    try {
+        return startUpdate(*context.connection.operations, candidate);
+    } catch (const NoAnswer& error) {
+        outcome.after.clear();
+        outcome.end(
+            "unknown",
+            {error.what() + (" The update of " + outcome.adapter) + " may have begun.",
+             "\"quenxctl jobs\" shows whether it runs, \"quenxctl adapters\" which firmware is there. "
+             "Look before you install again.",
+             error.status() == ExitStatus::Interrupted ? ExitStatus::Interrupted : ExitStatus::Unknown});
+        return std::nullopt;
+    }
+}
 
-ExitStatus install(Context& context, const VerbOptions& options) {
-    const Candidate candidate = makeCandidate(context.connection, options.image);
+/// Throws CommandError with ExitStatus::Interrupted only while nothing has been started.
+ExitStatus installUnlessInterrupted(Context& context, const ImageOptions& image) {
+    const Candidate candidate = makeCandidate(context.connection, image);
     Outcome outcome(candidate);
     // Found out here: the service would write the same image again.
     if (!candidate.force && candidate.isAlreadyCurrent()) {
@@ -152,17 +181,28 @@ ExitStatus install(Context& context, const VerbOptions& options) {
         return print(context, outcome);
     }
     // The last moment to stop: nobody can once the service has been called.
-    if (context.following.interrupted())
-        throw CommandError(ExitStatus::Failed, "Interrupted before the update began: nothing was changed.",
-                           "");
-    const core::MethodResult result = startUpdate(*context.connection.operations, candidate);
-    outcome.returnValue = result.returnValue;
-    if (result.returnValue == MethodReturn::JobStarted) {
-        followUpdate(context, jobOf(result), candidate, outcome);
+    if (context.following.interrupted()) throw CommandError(ExitStatus::Interrupted, "Interrupted.", "");
+    const std::optional<core::MethodResult> result = start(context, candidate, outcome);
+    if (!result) return print(context, outcome);
+    outcome.returnValue = result->returnValue;
+    if (result->returnValue == MethodReturn::JobStarted) {
+        followUpdate(context, jobOf(*result), candidate, outcome);
     } else {
-        outcome.end("refused", explainRefusal(context.connection, result.returnValue, candidate));
+        outcome.end("refused", explainRefusal(context.connection, result->returnValue, candidate));
     }
     return print(context, outcome);
+}
+
+}  // namespace
+
+ExitStatus install(Context& context, const VerbOptions& options) {
+    try {
+        return installUnlessInterrupted(context, options.image);
+    } catch (const CommandError& error) {
+        if (error.status() != ExitStatus::Interrupted) throw;
+        throw CommandError(ExitStatus::Interrupted,
+                           "Interrupted before the update began: nothing was changed.", "");
+    }
 }
 
 ExitStatus check(Context& context, const VerbOptions& options) {
