@@ -181,14 +181,14 @@ class DeclarationCache {
 }  // namespace
 
 const std::vector<std::string_view>& qualifierScopes() {
-    static const Scopes scopes{"CLASS",  "ASSOCIATION", "REFERENCE", "PROPERTY",
+    static const Scopes kScopes{"CLASS",  "ASSOCIATION", "REFERENCE", "PROPERTY",
                                "METHOD", "PARAMETER",   "INDICATION"};
-    return scopes;
+    return kScopes;
 }
 
 const std::vector<QualifierDeclaration>& qualifierDeclarations() {
-    static const std::vector<QualifierDeclaration> declarations = makeDeclarations();
-    return declarations;
+    static const std::vector<QualifierDeclaration> kDeclarations = makeDeclarations();
+    return kDeclarations;
 }
 
 const QualifierDeclaration* findQualifierDeclaration(std::string_view name) {

@@ -25,33 +25,33 @@ constexpr CimParameterInfo optional(CimParameterInfo parameter) {
     return parameter;
 }
 
-constexpr CimParameterInfo job = out(reference("Job", "CIM_ConcreteJob"));
-constexpr CimParameterInfo uri = in("URI", CimType::String, false);
-constexpr CimParameterInfo source = reference("Source", "CIM_SoftwareIdentity");
-constexpr CimParameterInfo target = reference("Target", "CIM_ManagedElement");
-constexpr CimParameterInfo collection = reference("Collection", "CIM_Collection");
-constexpr CimParameterInfo options = in("InstallOptions", CimType::Uint16, true);
-constexpr CimParameterInfo values = optional(in("InstallOptionsValues", CimType::String, true));
-constexpr CimParameterInfo characteristics = out(in("InstallCharacteristics", CimType::Uint16, true));
+constexpr CimParameterInfo kJobInfo = out(reference("Job", "CIM_ConcreteJob"));
+constexpr CimParameterInfo kUriInfo = in("URI", CimType::String, false);
+constexpr CimParameterInfo kSourceInfo = reference("Source", "CIM_SoftwareIdentity");
+constexpr CimParameterInfo kTargetInfo = reference("Target", "CIM_ManagedElement");
+constexpr CimParameterInfo kCollectionInfo = reference("Collection", "CIM_Collection");
+constexpr CimParameterInfo kOptionsInfo = in("InstallOptions", CimType::Uint16, true);
+constexpr CimParameterInfo kValuesInfo = optional(in("InstallOptionsValues", CimType::String, true));
+constexpr CimParameterInfo kCharacteristicsInfo = out(in("InstallCharacteristics", CimType::Uint16, true));
 
 // Of target and collection exactly one is given, so a client may leave out either.
-constexpr CimParameterInfo checkSoftwareIdentity[] = {
-    source,
-    optional(target),
-    optional(collection),
-    characteristics,
+constexpr CimParameterInfo kCheckSoftwareIdentity[] = {
+    kSourceInfo,
+    optional(kTargetInfo),
+    optional(kCollectionInfo),
+    kCharacteristicsInfo,
 };
-constexpr CimParameterInfo installFromSoftwareIdentity[] = {
-    job, options, values, source, optional(target), optional(collection),
+constexpr CimParameterInfo kInstallFromSoftwareIdentity[] = {
+    kJobInfo, kOptionsInfo, kValuesInfo, kSourceInfo, optional(kTargetInfo), optional(kCollectionInfo),
 };
-constexpr CimParameterInfo installFromUri[] = {
-    job, uri, target, options, values,
+constexpr CimParameterInfo kInstallFromUri[] = {
+    kJobInfo, kUriInfo, kTargetInfo, kOptionsInfo, kValuesInfo,
 };
 
-constexpr core::CimMethodInfo methods[] = {
-    {"CheckSoftwareIdentity", CimType::Uint32, checkSoftwareIdentity},
-    {"InstallFromSoftwareIdentity", CimType::Uint32, installFromSoftwareIdentity},
-    {"InstallFromURI", CimType::Uint32, installFromUri},
+constexpr core::CimMethodInfo kMethods[] = {
+    {"CheckSoftwareIdentity", CimType::Uint32, kCheckSoftwareIdentity},
+    {"InstallFromSoftwareIdentity", CimType::Uint32, kInstallFromSoftwareIdentity},
+    {"InstallFromURI", CimType::Uint32, kInstallFromUri},
 };
 
 constexpr const char* kInstallResults =
@@ -112,7 +112,7 @@ constinit const core::CimClassInfo CIM_SoftwareInstallationService::classInfo{
     "CIM_SoftwareInstallationService",
     &CIM_Service::classInfo,
     false,
-    methods,
+    kMethods,
     &core::makeSample<CIM_SoftwareInstallationService>,
     kTexts,
     kMentioned};

@@ -27,6 +27,6 @@ class SoftwareInventoryAgent : public core::CimAgent {
 };
 
 // Loading the library is what registers the provider; unloading it takes it away.
-const SoftwareInventoryAgent agent;
+const SoftwareInventoryAgent kAgent;
 
 }  // namespace

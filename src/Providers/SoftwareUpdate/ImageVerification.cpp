@@ -26,11 +26,11 @@ constexpr const char* kCheckAndVerifyImage = "checkAndVerifyImage";
 
 /// The index of the name in the table of target types; logs the comparison.
 std::optional<utils::FirmwareType> findTargetType(const std::string& name) {
-    constexpr auto& names = Quenx_SoftwareInstallationServiceCapabilities::TargetTypesDescription;
-    for (std::size_t index = 0; index < names.size(); ++index) {
+    constexpr auto& kNames = Quenx_SoftwareInstallationServiceCapabilities::TargetTypesDescription;
+    for (std::size_t index = 0; index < kNames.size(); ++index) {
         utils::formatDebugLog(__FILE__, kGetTargetTypes, __LINE__, "index: %d", static_cast<int>(index));
-        utils::formatDebugLog(__FILE__, kGetTargetTypes, __LINE__, "compare with %s", names[index]);
-        if (name == names[index]) return static_cast<utils::FirmwareType>(index);
+        utils::formatDebugLog(__FILE__, kGetTargetTypes, __LINE__, "compare with %s", kNames[index]);
+        if (name == kNames[index]) return static_cast<utils::FirmwareType>(index);
     }
     return std::nullopt;
 }

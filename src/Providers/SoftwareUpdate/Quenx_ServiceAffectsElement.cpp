@@ -18,8 +18,8 @@ void associate(const CIM_Service* service, const CIM_ManagedElement* affected, R
 }
 
 bool isSupportedType(const std::string& type) {
-    constexpr auto& names = Quenx_SoftwareInstallationServiceCapabilities::TargetTypesDescription;
-    return std::find(std::next(names.begin()), names.end(), type) != names.end();
+    constexpr auto& kNames = Quenx_SoftwareInstallationServiceCapabilities::TargetTypesDescription;
+    return std::find(std::next(kNames.begin()), kNames.end(), type) != kNames.end();
 }
 
 /// A firmware image with target types, all of which the service supports.

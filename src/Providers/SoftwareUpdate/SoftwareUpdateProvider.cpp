@@ -4,6 +4,6 @@
 
 namespace {
 
-const core::SoftwareUpdateAgent agent;
+const core::SoftwareUpdateAgent kAgent;
 
 }  // namespace
