@@ -125,7 +125,8 @@ void addImageVerbs(CLI::App& app, Arguments& arguments) {
                    "Install a firmware image on an adapter and wait until it is done");
     verb->alias("update");
     addImageOptions(*verb, options, "Image: a path or a file URI");
-    verb->add_flag("--force", options.force, "Also install an older image, or the same one again");
+    verb->add_flag("--force", options.force,
+                   "Also install an older image, the same one again, or one with other image types");
     verb->footer("An update that has begun always runs to its end: Ctrl-C does not stop it.");
 }
 

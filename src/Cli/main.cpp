@@ -128,9 +128,9 @@ int main(int argc, char** argv) {
     // A result that nobody can read is a failure; an update, though, has happened whether or not anybody
     // reads about it.
     const bool mayHaveUpdated = arguments && arguments->startsUpdate();
-    if (!std::cout.flush() && !mayHaveUpdated && status == cli::ExitStatus::Done) {
+    if (!std::cout.flush()) {
         std::cerr << "quenxctl: Cannot write the output.\n";
-        status = cli::ExitStatus::Failed;
+        if (!mayHaveUpdated && status == cli::ExitStatus::Done) status = cli::ExitStatus::Failed;
     }
     return static_cast<int>(status);
 }

@@ -365,6 +365,11 @@ TEST(DaemonTest, NamesWhatKeepsItFromServing) {
         // A check says the same, but not of the daemon that a start would replace.
         {2, {"--check-config", lock, taken}, "port " + port + ": Address already in use."},
         {0, {"--check-config", held, taken}, ""},
+        // Where a start could not write is said, and not found out by the first update.
+        {2,
+         {"--check-config", held, free, "--adapters-description=" + (daemon.folder() / "adapters.toml"),
+          "--adapters-state=" + (folder / "empty/state")},
+         "empty/state: Not a directory. Check adapters.state."},
     };
     for (const auto& row : table) {
         const ProgramResult result = started(row.options);

@@ -66,7 +66,7 @@ TEST_F(WrongUseTest, RefusesWrongImagesNamingBothSides) {
     const auto pxe = test::madeRom({{FirmwareType::PXE, 2}}, 0x15ad, 0x07b0);
     const std::string differing = "check --target eth4 " + m_folder.write("pxe.rom", pxe);
     const std::string types =
-        "The image types differ: the image has IMG_PXE, but eth4 has IMG_iSCSI 1, IMG_UEFI 0.\n";
+        "The image types differ: the image has IMG_PXE, which eth4 does not: it has IMG_iSCSI 1, IMG_UEFI 0.\n";
     expectError(differing, 1, types + "Use an image with the same types, or --force, which works unless");
     EXPECT_EQ(quenxctl(differing + " --force").status, 0);
     expectError(differing + " --force --config " + m_folder.write("provider.conf", "OEMCustomizeable=5\n"), 1,

@@ -163,8 +163,8 @@ std::string otherTypesText(const Candidate& candidate) {
     const std::vector<Component>& installed = candidate.adapter.components;
     for (const Component& component : chosen) {
         if (versionOf(installed, component.type)) continue;
-        return "The image types differ: the image has " + component.type + ", but " + name + " has " +
-               componentsText(installed) + ".";
+        return "The image types differ: the image has " + component.type + ", which " + name +
+               " does not: it has " + componentsText(installed) + ".";
     }
     // A CLP entry point is part of the PXE image, so it goes with the old one.
     const bool losesClp =
@@ -179,9 +179,9 @@ Reason explainDowngrade(const Candidate& candidate) {
     if (!types.empty()) {
         return Explanation{
             types, candidate.force ? "Use an image with the same types: --force does not help where the "
-                                     "configuration forbids downgrades."
+                                     "configuration forbids other types (OEMCustomizeable=5)."
                                    : "Use an image with the same types, or --force, which works unless the "
-                                     "configuration forbids downgrades."};
+                                     "configuration forbids other types (OEMCustomizeable=5)."};
     }
     const std::string older = olderText(candidate);
     if (older.empty()) return std::nullopt;

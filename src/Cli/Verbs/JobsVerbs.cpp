@@ -75,6 +75,8 @@ ExitStatus showJobs(Context& context, const VerbOptions&) {
     const std::vector<JobView> jobs = jobsOfServer(context.connection);
     if (context.json) {
         printJson(context.out, {{"jobs", jobs}});
+    } else if (jobs.empty()) {
+        context.out << "There are no jobs.\n";
     } else {
         printJobs(context.out, jobs);
     }

@@ -22,12 +22,26 @@ namespace {
 
 namespace fs = std::filesystem;
 
+/// For a file that a start makes: whether it could be made, in the nearest folder that is there.
+void requireWritable(const std::string& file, const std::string& advice) {
+    fs::path nearest = fs::absolute(file);
+    std::error_code unreachable;  // counts as missing: the folder above says why
+    while (!fs::exists(nearest, unreachable))
+        nearest = nearest.parent_path();
+    int error = ::access(nearest.c_str(), W_OK) == 0 ? 0 : errno;
+    if (error == 0 && nearest != fs::absolute(file) && !fs::is_directory(nearest)) error = ENOTDIR;
+    if (error != 0)
+        throw std::runtime_error("Cannot write " + file + ": " + std::strerror(error) + ". " + advice);
+}
+
 /// Whether a daemon holds the lock file. Does not make it where it is missing.
 bool isDaemonRunning(const std::string& file) {
     if (fs::exists(file)) return !LockFile(file).isHeld();
     const fs::path directory = fs::absolute(file).parent_path();
     // The folder of the default is made at the start.
-    if (file != Settings().lockFile && !fs::is_directory(directory)) {
+    const bool isDefault = file == Settings().lockFile;
+    if (isDefault) requireWritable(file, "Run as root, or set daemon.lock_file.");
+    if (!isDefault && !fs::is_directory(directory)) {
         throw std::runtime_error("daemon.lock_file is " + file + ", but there is no directory " +
                                  directory.string() + ". Make it, or set daemon.lock_file to another file.");
     }
@@ -44,7 +58,12 @@ void checkPort(const std::string& address, std::uint16_t port, bool isRestart) {
 }
 
 void checkTls(const TlsSettings& settings) {
-    if (!areTlsFilesToBeMade(settings)) ServerCertificate(settings.certificate, settings.key);
+    if (!areTlsFilesToBeMade(settings)) {
+        ServerCertificate(settings.certificate, settings.key);
+        return;
+    }
+    for (const std::string& file : {settings.certificate, settings.key})
+        requireWritable(file, "Run as root, or set tls.certificate and tls.key to files that exist.");
 }
 
 void checkAuthentication(const AuthenticationSettings& settings) {
@@ -77,6 +96,7 @@ void checkAdapters(const Settings& settings) {
         ma::enumerateAdapters();
     } else {
         ma::Simulator(settings.adapters, settings.adapterState);
+        requireWritable(settings.adapterState, "Check adapters.state.");
     }
 }
 

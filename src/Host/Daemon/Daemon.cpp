@@ -48,7 +48,9 @@ std::string runningUpdates(core::CimOperations& operations) {
 
 /// systemd makes the folder of the default lock file (RuntimeDirectory=); without it a start by hand does.
 const std::string& withItsFolder(const std::string& path) {
-    if (path == Settings().lockFile) ::mkdir(path.substr(0, path.rfind('/')).c_str(), S_IRWXU);
+    if (path == Settings().lockFile && ::mkdir(path.substr(0, path.rfind('/')).c_str(), S_IRWXU) != 0 &&
+        errno != EEXIST)
+        throw std::system_error(errno, std::generic_category());
     return path;
 }
 

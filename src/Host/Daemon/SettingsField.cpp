@@ -126,6 +126,10 @@ void checkSettings(const Settings& s) {
     const std::string& method = s.authentication.method;
     refuseIf(!s.listen.https && !s.listen.http,
              "listen.https and listen.http are both false. Set one of them to true.");
+    const bool isSamePort = s.listen.httpsPort == s.listen.httpPort && s.listen.httpPort != 0;
+    refuseIf(s.listen.https && s.listen.http && isSamePort,
+             "listen.https_port and listen.http_port are both " + std::to_string(s.listen.httpPort) +
+                 ". Set one of them to another port.");
     refuseIf(method != "pam" && method != "users",
              "auth.method is \"" + method + "\". It must be \"pam\" or \"users\".");
     refuseIf(s.limits.anonymousBodyBytes > s.limits.bodyBytes,

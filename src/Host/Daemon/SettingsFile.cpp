@@ -70,7 +70,7 @@ std::string hintAt(std::string_view text, std::size_t line) {
 
 toml::table parse(const std::string& file) {
     const auto bytes = os::readWholeFile(file, SIZE_MAX);
-    if (!bytes) throw std::runtime_error(file + ": there is no such file");
+    if (!bytes) throw std::runtime_error("There is no file " + file + ". Check --config.");
     const std::string_view text(reinterpret_cast<const char*>(bytes->data()), bytes->size());
     try {
         return ma::parseToml(text);

@@ -35,7 +35,9 @@ const char* adviceFor(int error) {
         case EADDRINUSE:
             return "Stop the program that listens there, or set listen.https_port or listen.http_port.";
         case EACCES:
-            return "Ports below 1024 need root or CAP_NET_BIND_SERVICE. Set another port, or run with one.";
+            return "Ports below 1024 need CAP_NET_BIND_SERVICE, which root has outside of the service. Set "
+                   "another "
+                   "port, or grant it.";
         case EADDRNOTAVAIL:
             return "Set listen.address to an address of this machine, or to 0.0.0.0 or :: for all.";
         default:

@@ -20,7 +20,10 @@ namespace {
 }
 
 void check(int status, const std::string& file) {
-    if (status < 0) fail(file, ::gnutls_strerror(status));
+    if (status >= 0) return;
+    std::string why = ::gnutls_strerror(status);
+    if (why.ends_with('.')) why.pop_back();
+    fail(file, why);
 }
 
 std::string readPem(const std::string& file) {

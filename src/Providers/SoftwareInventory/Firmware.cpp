@@ -125,7 +125,8 @@ FirmwareCatalog::Files FirmwareCatalog::scan() {
     Entries entries;
     for (const std::string& directory : directories) {
         for (const std::string& name : os::listDirectory(directory)) {
-            const std::string path = directory + "/" + name;
+            std::string path = directory;
+            path.append("/").append(name);
             Stamp stamp;
             // A directory that the configuration lists twice is served once.
             if (entries.contains(path) || !takeStamp(path, stamp)) continue;
