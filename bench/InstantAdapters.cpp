@@ -35,21 +35,22 @@ class InstantBackend : public ma::Backend {
         return true;
     }
 
-    int prepareFlashImage(const std::string&, const uint8_t*, uint32_t, uint8_t*, uint32_t*,
-                          std::vector<utils::FirmwareType>&) override {
+    int prepareFlashImage(const std::string&, const std::uint8_t*, std::uint32_t, std::uint8_t*,
+                          std::uint32_t*, std::vector<utils::FirmwareType>&) override {
         return ma::PrepareStatus::Prepared;
     }
 
-    bool writeFlashImage(const std::string&, const uint8_t*, uint32_t, uint32_t&, std::string&) override {
+    bool writeFlashImage(const std::string&, const std::uint8_t*, std::uint32_t, std::uint32_t&,
+                         std::string&) override {
         return true;
     }
 
-    bool updateCapabilityWord(const std::string&, const std::vector<utils::FirmwareType>&, uint32_t&,
+    bool updateCapabilityWord(const std::string&, const std::vector<utils::FirmwareType>&, std::uint32_t&,
                               std::string&) override {
         return true;
     }
 
-    uint16_t getFlashImageUpdateProgress(const std::string&) override { return 0; }
+    std::uint16_t getFlashImageUpdateProgress(const std::string&) override { return 0; }
     bool setBootType(const std::string&, ma::BootType) override { return true; }
     ma::AdapterInfo getAdapterInfo(const std::string&) override { return {}; }
 

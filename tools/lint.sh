@@ -23,8 +23,19 @@ case "${1:-}" in
         echo "$0: unknown option $1 (see --help)" >&2
         exit 2
         ;;
-    "") list="$(since "$(git merge-base main HEAD)")" ;;
-    *) list="$(printf '%s\n' "$@")" ;;
+    "")
+        base="$(git merge-base main HEAD 2>/dev/null)" || {
+            echo "$0: There is no branch main to compare with. Fetch it (git fetch origin main:main), or use --all." >&2
+            exit 2
+        }
+        list="$(since "$base"; git ls-files --others --exclude-standard -- '*.cpp' '*.h')"
+        ;;
+    *)
+        for file in "$@"; do
+            [ -f "$file" ] || { echo "$0: There is no file $file." >&2; exit 2; }
+        done
+        list="$(printf '%s\n' "$@")"
+        ;;
 esac
 mapfile -t files < <(grep . <<<"$list" || true)
 if [ "${#files[@]}" = 0 ]; then
