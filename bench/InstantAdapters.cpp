@@ -12,6 +12,9 @@ namespace {
 constexpr std::size_t kPortsPerCard = 4;
 constexpr std::size_t kDevicesPerBus = 32;
 
+/// A check must not keep the adapter from the next one.
+constexpr const char* kSettings = "ReleaseClaimAfterCheck=1\n";
+
 class InstantBackend : public ma::Backend {
   public:
     explicit InstantBackend(std::size_t ports) {
@@ -61,7 +64,7 @@ class InstantBackend : public ma::Backend {
 }  // namespace
 
 InstantAdapters::InstantAdapters(std::size_t ports)
-    : m_config(m_folder.write("provider.conf", "FWFilePath=" + m_folder.path() + "\n")),
+    : m_config(m_folder.write("provider.conf", "FWFilePath=" + m_folder.path() + "\n" + kSettings)),
       m_imageUri("file://" + m_folder.write("image.rom", test::madeRom({{utils::FirmwareType::PXE, 2}}))) {
     utils::logLevel = 0;  // what is measured is not the system log
     m_previous = ma::setBackend(std::make_shared<InstantBackend>(ports));

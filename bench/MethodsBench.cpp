@@ -6,7 +6,6 @@
 #include "Framework/Classes/InstanceLifetime.h"
 #include "Framework/Requests/CimRequests.h"
 #include "InstantAdapters.h"
-#include "Providers/SoftwareUpdate/Quenx_ConcreteJob.h"
 #include "Providers/SoftwareUpdate/SoftwareUpdateAgent.h"
 
 namespace {
@@ -36,13 +35,12 @@ class Host {
     core::CimRequests m_requests{"root/cimv2"};
 };
 
-/// Calls the method again and again. The jobs that come of it are deleted, and claims freed, outside the
-/// time.
+/// Calls the method again and again. The jobs that come of it are deleted outside the time, and their end
+/// is waited for.
 void call(benchmark::State& state, Host& host, const char* method,
           const std::vector<core::Argument>& arguments, unsigned expected) {
     const core::CimPath service = host.first("Quenx_SoftwareInstallationService");
     for (auto _ : state) {
-        Quenx_ConcreteJob::m_servicedAdapter = std::string();
         const auto result = host.requests().invokeMethod(service, method, arguments);
         if (result.returnValue != expected) state.SkipWithError("unexpected return value");
         state.PauseTiming();

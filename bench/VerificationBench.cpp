@@ -5,7 +5,7 @@
 #include <span>
 
 #include "MidAPI/Image/OptionRomWriter.h"
-#include "Providers/SoftwareUpdate/Quenx_ConcreteJob.h"
+#include "Providers/SoftwareUpdate/ImageVerification.h"
 #include "Support/SimulatedAdapters.h"
 #include "Support/TestRoms.h"
 #include "Utils/Os/Linux/SMASHv2Config.h"
@@ -64,18 +64,12 @@ void readOnce(benchmark::State& state) {
 
 void verify(benchmark::State& state) {
     const Fixture fixture;
-    std::string uri = "file://" + fixture.path;
-    std::vector<std::uint16_t> options = {5};
-    std::vector<std::string> values;
+    const UpdateOrder order{"eth0", "file://" + fixture.path, {5}, {}};
     for (auto _ : state) {
-        std::unique_ptr<std::uint8_t[]> image;
-        std::uint32_t size = 0;
-        std::vector<utils::FirmwareType> types;
-        Quenx_ConcreteJob::m_servicedAdapter = std::string();
-        Quenx_ConcreteJob::checkAndVerifyImage("eth0", uri, options, values, image, size, types);
-        benchmark::DoNotOptimize(image.get());
+        VerifiedImage verified = verifyImage(order);
+        benchmark::DoNotOptimize(verified.image.bytes.get());
+        verified.claim.release();
     }
-    Quenx_ConcreteJob::m_servicedAdapter = std::string();
     state.SetBytesProcessed(state.iterations() * static_cast<std::int64_t>(kImageLength));
 }
 

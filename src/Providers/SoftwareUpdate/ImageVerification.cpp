@@ -51,7 +51,8 @@ void appendTargetTypes(const std::string& value, std::vector<utils::FirmwareType
     }
 }
 
-/// What Quenx_ConcreteJob::getTargetTypes() returns, without a word about the claim.
+}  // namespace
+
 std::vector<utils::FirmwareType> getTargetTypes(const std::vector<std::uint16_t>& options,
                                                 const std::vector<std::string>& values) {
     std::vector<utils::FirmwareType> types;
@@ -79,6 +80,8 @@ std::vector<utils::FirmwareType> getTargetTypes(const std::vector<std::uint16_t>
     if (types.empty()) QUENX_DEBUG("No TargetTypes defined");
     return types;
 }
+
+namespace {
 
 /// The local path that the URI names.
 std::string locate(const std::string& uri) {

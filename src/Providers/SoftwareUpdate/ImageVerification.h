@@ -30,6 +30,11 @@ struct VerifiedImage {
     PreparedImage image;
 };
 
+/// The image types that the options ask for, none for all that the image has. Throws
+/// utils::EInvalidParameter for a type that is not known, and leaves the claim alone.
+std::vector<utils::FirmwareType> getTargetTypes(const std::vector<std::uint16_t>& options,
+                                                const std::vector<std::string>& values);
+
 /// Reads the image that the URI names, has the adapter API prepare it and judges the answer. Claims nothing.
 /// Throws the refusals of MethodResults.h, and what the adapter API throws.
 PreparedImage examineImage(const UpdateOrder& order);

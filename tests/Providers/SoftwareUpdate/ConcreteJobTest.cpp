@@ -4,6 +4,7 @@
 #include <gtest/gtest.h>
 
 #include "Providers/SoftwareUpdate/JobThread.h"
+#include "Providers/SoftwareUpdate/MethodResults.h"
 #include "Providers/SoftwareUpdate/UpdateTest.h"
 #include "Support/TestRoms.h"
 
@@ -133,6 +134,12 @@ TEST_F(ConcreteJobTest, ReadsTargetTypesFromTheOptions) {
         EXPECT_EQ(types, row.types);
     }
     EXPECT_TRUE(logged("Return result[3]=%d"));
+
+    setClaim("eth1");
+    m_options = {32768};
+    m_values = {"IMG_ODD"};
+    EXPECT_THROW(Quenx_ConcreteJob::getTargetTypes(m_options, m_values), utils::EInvalidParameter);
+    EXPECT_EQ(claim(), "");
 }
 
 TEST_F(ConcreteJobTest, TheStatusOfThePreparationDecides) {
