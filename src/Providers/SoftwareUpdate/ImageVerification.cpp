@@ -146,7 +146,7 @@ void judge(int status, bool force, const std::string& uri, const std::string& ad
 
 /// Reads, prepares and judges the image.
 /// @param isAskingAdapter  set while the adapter API is at work
-PreparedImage examine(const UpdateOrder& order, bool& isAskingAdapter) {
+PreparedImage readAndPrepare(const UpdateOrder& order, bool& isAskingAdapter) {
     const auto& [adapterName, uri, options, values] = order;
     utils::formatDebugLog(__FILE__, kCheckAndVerifyImage, __LINE__, "Checking URI : '%s' ", uri.c_str());
     const std::string path = locate(uri);
@@ -173,7 +173,7 @@ PreparedImage examine(const UpdateOrder& order, bool& isAskingAdapter) {
 
 PreparedImage examineImage(const UpdateOrder& order) {
     bool isAskingAdapter = false;
-    return examine(order, isAskingAdapter);
+    return readAndPrepare(order, isAskingAdapter);
 }
 
 VerifiedImage verifyImage(const UpdateOrder& order) {
@@ -184,7 +184,7 @@ VerifiedImage verifyImage(const UpdateOrder& order) {
     claim.take(order.adapterName);
     bool isAskingAdapter = false;
     try {
-        PreparedImage image = examine(order, isAskingAdapter);
+        PreparedImage image = readAndPrepare(order, isAskingAdapter);
         return {std::move(claim), std::move(image)};
     } catch (const utils::Exception& exception) {
         // A refusal says that nothing was done to the adapter, so others may have it. An exception of the

@@ -34,7 +34,7 @@ Quenx_ConcreteJobClass& jobRegistry() {
 }
 
 /// A VerifyJobResult, found without claiming the adapter.
-int examine(const UpdateOrder& order) {
+int resultOfExamining(const UpdateOrder& order) {
     try {
         examineImage(order);
         return VerifyJobResult::Success;
@@ -173,7 +173,7 @@ unsigned int Quenx_SoftwareInstallationService::checkImage(const std::string& ur
     if (!areOptionsAccepted(options)) return MethodReturn::InvalidParameter;
     UpdateOrder order{{}, uri, options, values};
     if (const auto refused = resolve(kChecking, nullptr, target, order)) return *refused;
-    return returnValueOf(kChecking, examine(order), target.toString());
+    return returnValueOf(kChecking, resultOfExamining(order), target.toString());
 }
 
 void Quenx_SoftwareInstallationService::refresh() {
