@@ -25,6 +25,7 @@ class JobThread : public utils::Thread {
 
     /// Throws utils::Exception when the system refuses a thread; the worker counts as started all the same.
     void start();
+    /// True once the worker is done with its job and may be destroyed.
     bool isExecuted() const { return m_executed == true; }
     /// Asks the worker to stop and waits in steps of 50 ms. With a time-out that is a multiple of 50 the
     /// result is always true, even when the worker is still running.

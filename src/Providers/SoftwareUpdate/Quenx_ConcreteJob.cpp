@@ -21,13 +21,14 @@ constexpr std::uint16_t kOperationalStatusOk = 2;
 /// Only reported: nothing removes a job but its client.
 constexpr std::uint64_t kFiveMinutes = 300000000;
 
+/// No further change will come.
 bool hasEnded(JobStateVal state) {
     return state == JobStateCompleted || state == JobStateException;
 }
 
-/// Whether a job in this state has given up its adapter; nothing for values that say neither. Nothing enters
-/// Terminated or Killed, and they count as unfinished.
-std::optional<bool> isFinished(JobStateVal state) {
+/// Whether a job gives up its adapter in this state, which a job that is shutting down does before its end;
+/// nothing for values that say neither. Nothing enters Terminated or Killed, and they keep the adapter.
+std::optional<bool> givesUpTheAdapter(JobStateVal state) {
     switch (state) {
         case JobStateShuttingDown:
         case JobStateCompleted:
@@ -115,9 +116,9 @@ void Quenx_ConcreteJob::setJobState(JobStateVal state) {
     m_jobState = state;
     m_startClaimed = false;
     m_timeOfLastStateChange.resetTimer();
-    m_finished = isFinished(state).value_or(m_finished);
+    m_adapterGivenUp = givesUpTheAdapter(state).value_or(m_adapterGivenUp);
     if (state == JobStateCompleted) m_elapsedTime.setInterval(m_startTime);
-    if (!m_finished) return;
+    if (!m_adapterGivenUp) return;
     released.swap(m_flashImage);
     m_flashImageSize = 0;
     m_claim.release();

@@ -97,7 +97,7 @@ class Quenx_ConcreteJob : public CIM_ConcreteJob {
     utils::Time m_elapsedTime QUENX_GUARDED_BY(m_stateMutex);
     JobStateVal m_jobState QUENX_GUARDED_BY(m_stateMutex) = JobStateNew;
     bool m_startClaimed QUENX_GUARDED_BY(m_stateMutex) = false;
-    bool m_finished QUENX_GUARDED_BY(m_stateMutex) = false;
+    bool m_adapterGivenUp QUENX_GUARDED_BY(m_stateMutex) = false;
     AdapterClaim m_claim QUENX_GUARDED_BY(m_stateMutex){m_servicedAdapter};
     utils::Mutex m_jobMutex;  ///< one thread operation at a time
     utils::Time m_timeOfLastStateChange QUENX_GUARDED_BY(m_stateMutex){0ULL};
