@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Providers/SoftwareUpdate/MethodResults.h"
 
+#include <optional>
+
 #include "Utils/Log.h"
 
 namespace {
@@ -10,12 +12,12 @@ bool is(const utils::Exception& exception) {
     return dynamic_cast<const T*>(&exception) != nullptr;
 }
 
-struct Handler {
-    bool (*handles)(const utils::Exception&);
+struct RefusalCode {
+    bool (*isOf)(const utils::Exception&);
     int code;
 };
 
-constexpr Handler kHandlers[] = {
+constexpr RefusalCode kRefusalCodes[] = {
     {is<EJobIsRunning>, VerifyJobResult::JobIsRunning},
     {is<ETargetInUse>, VerifyJobResult::TargetInUse},
     {is<EInvalidUri>, VerifyJobResult::InvalidUri},
@@ -28,11 +30,11 @@ constexpr Handler kHandlers[] = {
     {is<ENotApplicableForTarget>, VerifyJobResult::NotApplicableForTarget},
 };
 
-/// Success for an exception that is not a refusal.
-int codeOf(const utils::Exception& exception) {
-    for (const Handler& handler : kHandlers)
-        if (handler.handles(exception)) return handler.code;
-    return VerifyJobResult::Success;
+/// Nothing for an exception that is not a refusal.
+std::optional<int> codeOf(const utils::Exception& exception) {
+    for (const RefusalCode& refusal : kRefusalCodes)
+        if (refusal.isOf(exception)) return refusal.code;
+    return std::nullopt;
 }
 
 /// A line of the log is `before`, the target's path, `after`.
@@ -43,7 +45,8 @@ struct Verdict {
     const char* after;
 };
 
-// Clients know these rows as they are, the two lines that end in a blank included.
+// Clients know these rows as they are, the two lines that end in a blank included. InvalidParameter is not
+// among them: its line depends on the method, so returnValueOf() writes it.
 constexpr Verdict kVerdicts[] = {
     {VerifyJobResult::AdapterNotSupported, MethodReturn::UnsupportedTargetType,
      "Target is not supported by service for '", "'"},
@@ -63,17 +66,17 @@ constexpr Verdict kVerdicts[] = {
 }  // namespace
 
 bool isRefusal(const utils::Exception& exception) {
-    return codeOf(exception) != VerifyJobResult::Success;
+    return codeOf(exception).has_value();
 }
 
 int verifyJobResultOfCurrentException() noexcept {
     try {
         throw;
     } catch (const utils::Exception& exception) {
-        const int code = codeOf(exception);
-        if (code == VerifyJobResult::Success) return VerifyJobResult::UnspecifiedError;
+        const std::optional<int> code = codeOf(exception);
+        if (!code) return VerifyJobResult::UnspecifiedError;
         QUENX_ERROR("Exception: '%s'", exception.what());
-        return code;
+        return *code;
     } catch (...) {
         // What is not a refusal has logged itself, if it could.
         return VerifyJobResult::UnspecifiedError;
