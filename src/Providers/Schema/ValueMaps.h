@@ -41,8 +41,17 @@ struct MethodReturn {
 /// InstallOptions of the same methods.
 struct InstallOption {
     enum Value : std::uint16_t {
+        DeferReset = 2,
         ForceInstallation = 3,
+        Install = 4,
         Update = 5,
+        Repair = 6,
+        Reboot = 7,
+        Password = 8,
+        Uninstall = 9,
+        Log = 10,
+        SilentMode = 11,
+        AdministrativeMode = 12,
         /// The first vendor-specific value: the option value at the same position lists target types.
         TargetTypes = 32768,
     };

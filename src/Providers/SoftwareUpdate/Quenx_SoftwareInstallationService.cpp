@@ -15,9 +15,13 @@ using core::CimPropertyList;
 
 constexpr std::uint16_t kOperationalStatusOk = 2;
 
-/// Options that nothing here can carry out. The identity method supplies the target types itself, so it
-/// refuses them from the client, while InstallFromURI takes them.
-constexpr std::uint16_t kRefusedOptions[] = {2, 4, 6, 7, 8, 9, 10, 11, 12};
+/// Options that nothing here can carry out; TargetTypes has a rule of its own: the identity method supplies
+/// the target types itself, so it refuses them from the client, while InstallFromURI takes them.
+constexpr std::uint16_t kRefusedOptions[] = {
+    InstallOption::DeferReset, InstallOption::Install,    InstallOption::Repair,
+    InstallOption::Reboot,     InstallOption::Password,   InstallOption::Uninstall,
+    InstallOption::Log,        InstallOption::SilentMode, InstallOption::AdministrativeMode,
+};
 
 bool areOptionsAccepted(const std::vector<std::uint16_t>& options) {
     const auto isGiven = [&options](std::uint16_t option) {
