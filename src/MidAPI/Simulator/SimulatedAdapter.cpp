@@ -114,7 +114,8 @@ std::string describeHolder(const std::string& adapter, pid_t holder) {
 /// Runs an operation and turns what it throws into the API's code and text. AdapterError, which faults throw,
 /// passes through.
 template <typename Action>
-bool report(const std::string& adapter, std::uint32_t& errorCode, std::string& errorText, Action action) {
+bool runReporting(const std::string& adapter, std::uint32_t& errorCode, std::string& errorText,
+                  Action action) {
     errorCode = WriteError::NoError;
     errorText.clear();
     try {
@@ -208,7 +209,7 @@ int SimulatedAdapter::prepare(std::span<const std::uint8_t> file, std::span<std:
     m_progress.prepared();
     try {
         FaultRun(m_faults, Operation::Prepare).reach();
-        return prepareUnguarded(file, output, imageSize, types);
+        return prepareOrThrow(file, output, imageSize, types);
     } catch (const OperationFailure& failure) {
         QUENX_ERROR("adapter %s: %s", m_description.name.c_str(), failure.what());
         return static_cast<int>(failure.code());
@@ -218,9 +219,9 @@ int SimulatedAdapter::prepare(std::span<const std::uint8_t> file, std::span<std:
     }
 }
 
-PrepareStatus SimulatedAdapter::prepareUnguarded(std::span<const std::uint8_t> file,
-                                                 std::span<std::uint8_t> output, std::uint32_t& imageSize,
-                                                 std::vector<utils::FirmwareType>& types) {
+PrepareStatus SimulatedAdapter::prepareOrThrow(std::span<const std::uint8_t> file,
+                                               std::span<std::uint8_t> output, std::uint32_t& imageSize,
+                                               std::vector<utils::FirmwareType>& types) {
     const PreparationTarget target{m_description.ids.vendor, m_description.ids.device,
                                    m_description.canBeUpdated, components()};
     const Preparation preparation = assessImage(target, file, types);
@@ -248,7 +249,7 @@ void SimulatedAdapter::requireWritable(std::span<const std::uint8_t> image) cons
 
 bool SimulatedAdapter::write(std::span<const std::uint8_t> image, std::uint32_t& errorCode,
                              std::string& errorText) {
-    return report(m_description.name, errorCode, errorText, [&] {
+    return runReporting(m_description.name, errorCode, errorText, [&] {
         // What can be refused without the lock is: a second writer then reads what is wrong, not "busy".
         requireWritable(image);
         const os::FileLock lock = m_store.lockForWriting();
@@ -259,7 +260,7 @@ bool SimulatedAdapter::write(std::span<const std::uint8_t> image, std::uint32_t&
 }
 
 void SimulatedAdapter::writeLocked(std::span<const std::uint8_t> image) {
-    constexpr std::uint64_t kNotYetBooted = 99;  // 100 is for the update that is in force
+    constexpr std::uint64_t kMaxPercentBeforeBoot = 99;  // 100 is for the update that is in force
     const std::vector<std::uint8_t> merged = mergeOptionRoms(m_store.content(), image);
     // Each image is in order, but together with those that stay they may be too many.
     if (const RomFile rom = parseOptionRom(merged); rom.error)
@@ -272,7 +273,7 @@ void SimulatedAdapter::writeLocked(std::span<const std::uint8_t> image) {
         const auto percent = static_cast<unsigned int>(std::uint64_t{written} * 100 / merged.size());
         pace.waitFor(written);
         m_progress.advance(
-            static_cast<std::uint16_t>(std::uint64_t{written} * kNotYetBooted / merged.size()));
+            static_cast<std::uint16_t>(std::uint64_t{written} * kMaxPercentBeforeBoot / merged.size()));
         faults.reach(percent);
     });
     m_progress.advance(100);
@@ -280,7 +281,7 @@ void SimulatedAdapter::writeLocked(std::span<const std::uint8_t> image) {
 
 bool SimulatedAdapter::updateCapabilityWord(const std::vector<utils::FirmwareType>& types,
                                             std::uint32_t& errorCode, std::string& errorText) {
-    return report(m_description.name, errorCode, errorText, [&] {
+    return runReporting(m_description.name, errorCode, errorText, [&] {
         FaultRun(m_faults, Operation::CapabilityWord).reach();
         std::uint32_t wanted = 0;
         for (const utils::FirmwareType type : types)
@@ -295,7 +296,7 @@ bool SimulatedAdapter::updateCapabilityWord(const std::vector<utils::FirmwareTyp
 bool SimulatedAdapter::setBootType(BootType type) {
     std::uint32_t errorCode = 0;
     std::string errorText;
-    return report(m_description.name, errorCode, errorText, [&] {
+    return runReporting(m_description.name, errorCode, errorText, [&] {
         FaultRun(m_faults, Operation::BootType).reach();
         m_store.changeState([type](FlashState& state) { state.bootType = static_cast<std::uint32_t>(type); });
     });

@@ -82,8 +82,8 @@ class SimulatedAdapter {
     std::vector<utils::FirmwareVersionInfo> components();
     void requireWritable(std::span<const std::uint8_t> image) const;
     void writeLocked(std::span<const std::uint8_t> image);
-    PrepareStatus prepareUnguarded(std::span<const std::uint8_t> file, std::span<std::uint8_t> output,
-                                   std::uint32_t& imageSize, std::vector<utils::FirmwareType>& types);
+    PrepareStatus prepareOrThrow(std::span<const std::uint8_t> file, std::span<std::uint8_t> output,
+                                 std::uint32_t& imageSize, std::vector<utils::FirmwareType>& types);
 
     const AdapterDescription m_description;
     FlashStore m_store;
