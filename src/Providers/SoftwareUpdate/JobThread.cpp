@@ -15,10 +15,9 @@ constexpr std::uint32_t kStartPause = 10;       // ms
 constexpr std::uint32_t kTerminationPoll = 50;  // ms
 constexpr int kDestructionTimeout = 3000;       // ms
 constexpr std::uint32_t kTimeoutErrorCode = 4;
-constexpr auto kDefaultBootType = static_cast<ma::BootType>(0);
 
-/// A binary search in the list as it is. Nobody sorts it: in an unsorted list the search may miss, and does
-/// no harm.
+/// A binary search. ma::prepareFlashImage() leaves the types ascending; only a backend that answers a status
+/// which is not known may leave them as they were requested, and the search may then miss.
 bool holdsType(const std::vector<utils::FirmwareType>& types, utils::FirmwareType wanted) {
     std::size_t begin = 0;
     std::size_t end = types.size();
@@ -85,6 +84,7 @@ void JobThread::execute() {
     try {
         succeeded = flash();
     } catch (...) {
+        // The old text for every exception: docs/compatibility.md.
         QUENX_DEBUG("Access to the KD is disabled at this moment.");
         m_myJob->setLastError(kTimeoutErrorCode, "Timeout Error");
     }
@@ -98,6 +98,8 @@ bool JobThread::flash() {
     // Fails when the process has no locker; one that is busy does not matter.
     const os::OSLocker::AutoOSLocker adapterLock;
     const std::string adapterName = m_myJob->getAdapterName();
+    // Before the write: on a device that does lose the image, a cut in between would leave an adapter that
+    // boots from what is not there.
     if (!holdsType(m_myJob->getImageTypes(), utils::FirmwareType::iSCSI)) resetBootType(adapterName);
 
     std::uint32_t errorCode = 0;
@@ -117,7 +119,9 @@ bool JobThread::flash() {
     return updated;
 }
 
-/// An adapter that loses its iSCSI boot image must not go on trying to boot from it, on any of its functions.
+/// Where the adapter has an iSCSI image and the update brings none, every function of the card gets the
+/// default boot type. Clients know this reset. The simulator keeps an iSCSI image that is not replaced, so
+/// there nothing would require it.
 void JobThread::resetBootType(const std::string& adapterName) {
     std::vector<utils::FirmwareVersionInfo> components;
     ma::getAdapterFirmwareVersion(adapterName, components);
@@ -128,6 +132,6 @@ void JobThread::resetBootType(const std::string& adapterName) {
     if (!hasIscsi) return;
     const utils::PCIAddr address = ma::getPCIAddress(adapterName);
     for (const std::string& other : ma::enumerateAdapters()) {
-        if (ma::getPCIAddress(other).sameAdapter(address)) ma::setBootType(other, kDefaultBootType);
+        if (ma::getPCIAddress(other).sameAdapter(address)) ma::setBootType(other, ma::BootType::None);
     }
 }

@@ -17,18 +17,19 @@ class JobThread : public utils::Thread {
   public:
     /// The job outlives the worker. Throws the assertion for a null pointer.
     explicit JobThread(Quenx_ConcreteJob* job);
-    /// Waits for a worker that has been started: asks it to stop, and after 3 seconds waits until it ends.
+    /// Waits until a worker that has been started ends, however long its flash takes.
     ~JobThread() override;
 
     void execute() override;
+    /// Notes the wish to stop, which nothing reads.
     virtual void stopFwUpdateExecution();
 
     /// Throws utils::Exception when the system refuses a thread; the worker counts as started all the same.
     void start();
     /// True once the worker is done with its job and may be destroyed.
     bool isExecuted() const { return m_executed == true; }
-    /// Asks the worker to stop and waits in steps of 50 ms. With a time-out that is a multiple of 50 the
-    /// result is always true, even when the worker is still running.
+    /// Waits up to `timeout` ms for the worker, in steps of 50. Nothing stops a flash. With a time-out that
+    /// is a multiple of 50 the result is always true, even when the worker is still running.
     bool terminate(int timeout);
 
     /// Executions begun since the library was loaded.

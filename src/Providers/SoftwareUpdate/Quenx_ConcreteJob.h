@@ -22,7 +22,7 @@ enum RequestedState : std::uint16_t { RequestedStateStart = 2 };
 
 enum ThreadOperationCommand : int {
     ThreadStart = 1,
-    ThreadTerminate = 2,  ///< ask the worker to stop, and wait
+    ThreadTerminate = 2,  ///< wait for the worker; nothing stops a flash
     ThreadDispose = 3,    ///< destroy the worker if it has finished
 };
 
@@ -31,7 +31,8 @@ class Quenx_ConcreteJob : public CIM_ConcreteJob {
   public:
     static constexpr core::CimClassInfo classInfo{"Quenx_ConcreteJob", &CIM_ConcreteJob::classInfo};
 
-    /// The adapter that is being serviced; empty when none is. AdapterClaim alone writes it.
+    /// The adapter that is being serviced; empty when none is. In the library only AdapterClaim writes
+    /// it; tests set it directly.
     static utils::Atomic<std::string> m_servicedAdapter;
 
     /// Verifies the image and claims the adapter; throws what verifyImage() throws. Creates the worker but
@@ -74,8 +75,8 @@ class Quenx_ConcreteJob : public CIM_ConcreteJob {
     /// back, whoever claimed it, and throws utils::EInvalidParameter.
     static std::vector<utils::FirmwareType> getTargetTypes(std::vector<std::uint16_t>& installOptions,
                                                            std::vector<std::string>& installOptionValues);
-    /// verifyImage() for callers that keep the claim to themselves: the adapter stays claimed, and setting
-    /// m_servicedAdapter gives it back.
+    /// verifyImage() for callers that keep the claim to themselves: the adapter stays claimed until
+    /// m_servicedAdapter is set.
     /// @param image,imageSize,imageTypes  set on success
     static void checkAndVerifyImage(std::string adapterName, std::string& uri,
                                     std::vector<std::uint16_t>& installOptions,
