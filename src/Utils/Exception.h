@@ -30,8 +30,8 @@ class QUENX_EXPORT Exception : public std::exception {
     std::string m_message;
 };
 
-/// A caller's mistake in the arguments of a method. What answers the caller tells it from every other
-/// failure, so it is known to all floors.
+/// Two uses: from a method, a caller's mistake in the arguments (the request layer answers InvalidParameter);
+/// from verification, a failure without a name (return value 2). The name and the text are known to clients.
 class QUENX_EXPORT EUnspecifiedError : public Exception {
   public:
     explicit EUnspecifiedError(std::string message);

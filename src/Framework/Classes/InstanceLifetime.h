@@ -15,8 +15,9 @@ class CimInstance;
 struct AgentRegistration;
 
 /// One request of a client, on the calling thread. Whatever is enumerated, looked up or added meanwhile on
-/// this thread stays alive until the scope ends, so plain pointers to instances are good that long. Every
-/// front opens one around each request. A scope inside a scope is part of the outer one.
+/// this thread stays alive until the scope ends, so plain pointers to instances are good that long. The
+/// request layer opens one around each request; code that calls the broker itself opens its own. A scope
+/// inside a scope is part of the outer one.
 class QUENX_EXPORT RequestScope {
   public:
     RequestScope();

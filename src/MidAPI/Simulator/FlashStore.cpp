@@ -224,7 +224,7 @@ void FlashStore::changeState(const std::function<void(FlashState&)>& change) {
 FlashState FlashStore::initialise() {
     makeFolders();
     const os::FileLock lock(path("state.lock"), os::FileLock::Mode::Wait);
-    // Under the lock once more: another process may have been first.
+    // Another process may have made the files while we waited for the lock.
     if (std::optional<FlashState> stored = storedState()) return *stored;
     FlashState state = m_factoryState;
     state.activeBank = 0;

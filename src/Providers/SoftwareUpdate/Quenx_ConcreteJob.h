@@ -76,7 +76,7 @@ class Quenx_ConcreteJob : public CIM_ConcreteJob {
     static std::vector<utils::FirmwareType> getTargetTypes(std::vector<std::uint16_t>& installOptions,
                                                            std::vector<std::string>& installOptionValues);
     /// verifyImage() for callers that keep the claim to themselves: the adapter stays claimed until
-    /// m_servicedAdapter is set.
+    /// m_servicedAdapter is emptied.
     /// @param image,imageSize,imageTypes  set on success
     static void checkAndVerifyImage(std::string adapterName, std::string& uri,
                                     std::vector<std::uint16_t>& installOptions,

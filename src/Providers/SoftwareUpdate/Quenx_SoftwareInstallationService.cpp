@@ -102,7 +102,7 @@ bool Quenx_SoftwareInstallationService::IsValueDefined(std::uint16_t value,
 unsigned int Quenx_SoftwareInstallationService::InstallFromURI(CimPropertyList& in, CimPropertyList&,
                                                                core::CimInstance*& job) {
     const utils::TimeStamp timing("Quenx_SoftwareInstallationService::InstallFromURI");
-    const core::RequestScope scope;
+    const core::RequestScope scope;  // for callers that come without the request layer
     const MethodArguments arguments(in);
     arguments.requirePresent({"URI", "Target", "InstallOptions", "InstallOptionsValues"});
     arguments.requireNotNull({"URI", "Target", "InstallOptions"});
@@ -120,7 +120,7 @@ unsigned int Quenx_SoftwareInstallationService::InstallFromSoftwareIdentity(CimP
                                                                             CimPropertyList&,
                                                                             core::CimInstance*& job) {
     const utils::TimeStamp timing("Quenx_SoftwareInstallationService::InstallFromSoftwareIdentity");
-    const core::RequestScope scope;
+    const core::RequestScope scope;  // for callers that come without the request layer
     const MethodArguments arguments(in);
     arguments.requirePresent({"InstallOptions", "InstallOptionsValues", "Source", "Target", "Collection"});
     QUENX_DEBUG("All arguments are defined");
@@ -145,7 +145,7 @@ unsigned int Quenx_SoftwareInstallationService::CheckSoftwareIdentity(CimPropert
     constexpr const char* kCharacteristics = "InstallCharacteristics";
     constexpr std::uint16_t kCharacteristic = 7;
     const utils::TimeStamp timing("Quenx_SoftwareInstallationService::CheckSoftwareIdentity");
-    const core::RequestScope scope;
+    const core::RequestScope scope;  // for callers that come without the request layer
     const MethodArguments arguments(in);
     const MethodArguments results(out);
     arguments.requirePresent({"Source", "Target", "Collection"});
@@ -173,7 +173,7 @@ unsigned int Quenx_SoftwareInstallationService::checkImage(const std::string& ur
                                                            const std::vector<std::uint16_t>& options,
                                                            const std::vector<std::string>& values) {
     const utils::TimeStamp timing("Quenx_SoftwareInstallationService::checkImage");
-    const core::RequestScope scope;
+    const core::RequestScope scope;  // for callers that come without the request layer
     if (!areOptionsAccepted(options)) return MethodReturn::InvalidParameter;
     UpdateOrder order{{}, uri, options, values};
     if (const auto refused = resolve(kChecking, nullptr, target, order)) return *refused;

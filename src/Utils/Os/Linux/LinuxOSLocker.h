@@ -8,8 +8,11 @@
 
 namespace os {
 
-/// The lock around work on adapters, shared by everything in the process that works on them. It is advisory.
-/// The hosting process constructs one, an OSLockerLinux; the current one serves all libraries.
+/// The lock around work on adapters, shared by everything in the process that works on them. The hosting
+/// process constructs one, an OSLockerLinux or one of its own, and the current one serves all libraries.
+///
+/// It is advisory. Who may write is decided by the adapter claim, and between processes by the adapter's own
+/// lock; the locker only tells other code of the host, which asks it by Lock(), that somebody is at work.
 class QUENX_EXPORT OSLocker : public utils::Singleton<OSLocker> {
   public:
     class AutoOSLocker;
@@ -25,8 +28,10 @@ class QUENX_EXPORT OSLocker : public utils::Singleton<OSLocker> {
     static const char* GetSingletonName() { return "OSLocker"; }
 };
 
-/// Holds the current locker for a scope. A busy one does not stop it, since the lock is advisory, a
-/// missing one does. If it is gone at the end of the scope, that is logged and nothing else happens.
+/// Holds the current locker for a scope. A busy one does not stop it, since the lock is advisory, a missing
+/// one does. The scope does not keep the answer of Lock(), so its end frees the locker also when it had found
+/// it busy: nothing that must be safe may rest on holding it. If the locker is gone at the end of the scope,
+/// that is logged and nothing else happens.
 class QUENX_EXPORT OSLocker::AutoOSLocker {
   public:
     /// @throws utils::Exception "No singleton instance found for OSLocker"

@@ -46,8 +46,9 @@ class QUENX_EXPORT SMASHv2Config : public AutoSingleton<SMASHv2Config> {
     /// Reads the file. Never throws.
     virtual void initialize();
 
-    /// True if a verify-only call gives back the adapter claim that it took (key ReleaseClaimAfterCheck, 0 or
-    /// 1).
+    /// True if a call that would keep the adapter claim that it took gives it back (key
+    /// ReleaseClaimAfterCheck, 0 or 1): CheckSoftwareIdentity, the registry's verifyOrCreateNewJob() without
+    /// `create`, and a failure that is not a refusal.
     bool getReleaseClaimAfterCheck();
 
     static const char* GetSingletonName() { return "SMASHv2Config"; }
