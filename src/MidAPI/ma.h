@@ -11,11 +11,11 @@
 #include "Utils/FirmwareTypes.h"
 #include "Utils/StringArray.h"
 
-/// The adapter API. An adapter name addresses one port (one PCI function) of an Ethernet adapter, as
-/// enumerateAdapters() returns it. Every operation may be called from any thread at any time, also for a port
-/// that another thread is writing to. Where an operation has no result to report a failure with, it throws
-/// AdapterError; all of them throw it when the adapters cannot be had at all (an adapter description with a
-/// mistake in it).
+/// The adapter API. An adapter name addresses one port (one PCI function) of a card, as enumerateAdapters()
+/// returns it. Every operation may be called from any thread at any time, also for a port that another
+/// thread is writing to. Where an operation has no result to report a failure with, it throws AdapterError;
+/// all of them throw it when the adapters cannot be had at all (an adapter description with a mistake in
+/// it).
 namespace ma {
 
 class Backend;
@@ -40,13 +40,12 @@ QUENX_EXPORT bool getAdapterFirmwareVersion(std::string adapter,
 /// @param file,fileSize  the file's bytes; only read
 /// @param output         the caller's buffer of `fileSize` bytes; may not overlap `file`
 /// @param imageSize      the size of `output` on entry; the length of the image in it on return
-/// @param types          in: the types to install, in any order, type 0 ignored, none for all that the file
-/// has;
-///                       out: the types of the prepared image, ascending. Unchanged where the output is not
-///                       filled.
-/// @return a PrepareStatus. Output, size and types are filled for PrepareStatus::Prepared,
-/// PrepareStatus::ImageIsOlder and PrepareStatus::ImageTypesDiffer,
-///         since a caller may insist on the latter two. The reason of any other status than 0 is logged.
+/// @param types          in: the types to install, in any order, type 0 ignored, none for all in the file;
+///                       out: those of the prepared image, ascending; unchanged where `output` is not filled
+/// @return  a PrepareStatus. Output, size and types are filled for Prepared, ImageIsOlder and
+///          ImageTypesDiffer, since a caller may insist on the latter two. The reason of any other status
+///          than Prepared is logged.
+///
 /// Sets the port's progress to 0, unless it is being written to.
 QUENX_EXPORT int prepareFlashImage(std::string adapter, const std::uint8_t* file, std::uint32_t fileSize,
                                    std::uint8_t* output, std::uint32_t* imageSize,

@@ -24,7 +24,7 @@ struct PCIAddr {
     bool noFunction = false;  ///< true when the address carries no function number
     std::string text;         ///< free text of the adapter API
 
-    /// True when both ports belong to one physical adapter: the function is ignored.
+    /// True when both are ports of one card.
     bool sameAdapter(const PCIAddr& other) const { return bus == other.bus && device == other.device; }
 
     bool operator==(const PCIAddr& other) const = default;
