@@ -22,9 +22,9 @@ using test::statusOf;
 
 constexpr const char* kBadAddress = "127.0.0.2";
 #ifdef QUENX_SANITIZED
-constexpr long kMostMemory = 4000;
+constexpr long kMaxMemory = 4000;
 #else
-constexpr long kMostMemory = 150;  // MiB
+constexpr long kMaxMemory = 150;  // MiB
 #endif
 
 /// While a test attacks, a good client asks all the time, each time on a new connection, and is answered.
@@ -57,7 +57,7 @@ class HostileInputTest : public ::testing::Test {
         ::getrusage(RUSAGE_CHILDREN, &usage);
         std::cout << "a good client had " << m_times.size() << " answers, p99 " << p99.count()
                   << " ms; a daemon took " << usage.ru_maxrss / 1024 << " MiB at most\n";
-        EXPECT_LT(usage.ru_maxrss / 1024, kMostMemory);
+        EXPECT_LT(usage.ru_maxrss / 1024, kMaxMemory);
     }
 
     std::string answerTo(const std::string& bytes) const {

@@ -52,9 +52,9 @@ JobView viewOf(const core::InstanceValue& job) {
 JobView lookAt(core::CimOperations& operations, const core::CimPath& job, const Following& following) {
     // A connection can break, or the server be busy, and the update goes on all the same: so many looks in a
     // row may fail.
-    constexpr unsigned kMostFailures = 20;
+    constexpr unsigned kMaxFailures = 20;
     std::string reason;
-    for (unsigned failures = 0; failures < kMostFailures; ++failures) {
+    for (unsigned failures = 0; failures < kMaxFailures; ++failures) {
         if (failures > 0) following.pause();
         try {
             return viewOf(operations.getInstance(job));

@@ -16,7 +16,7 @@ namespace core {
 namespace {
 
 constexpr std::size_t kDatetimeLength = 25;
-constexpr int kMostDays = 99999999;
+constexpr int kMaxDays = 99999999;
 
 /// Whether an integer type has room for the value.
 template <class T>
@@ -222,8 +222,8 @@ std::string datetimeText(utils::Time time) {
     const int milliseconds = static_cast<int>(time.getMiliseconds() % 1000);
     std::array<char, 80> text{};
     if (time.isPeriod()) {
-        std::snprintf(text.data(), text.size(), "%08d%02d%02d%02d.%03d000:000", std::min(day, kMostDays),
-                      hour, minute, second, milliseconds);
+        std::snprintf(text.data(), text.size(), "%08d%02d%02d%02d.%03d000:000", std::min(day, kMaxDays), hour,
+                      minute, second, milliseconds);
     } else {
         std::snprintf(text.data(), text.size(), "%04d%02d%02d%02d%02d%02d.%03d000+000", std::min(year, 9999),
                       month, day, hour, minute, second, milliseconds);

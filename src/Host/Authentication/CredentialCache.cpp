@@ -12,7 +12,7 @@ namespace host {
 namespace {
 
 /// Only right credentials get in, so it takes many real users to come here.
-constexpr std::size_t kMostEntries = 1024;
+constexpr std::size_t kMaxEntries = 1024;
 
 }  // namespace
 
@@ -63,7 +63,7 @@ void CredentialCache::remember(const Credentials& credentials, const std::string
     // The users were read again while this password was checked: it may be wrong by now.
     if (generation != m_generation) return;
     // A linear search for the oldest is rare and short; an order of its own would cost with every look-up.
-    if (m_entries.size() >= kMostEntries) {
+    if (m_entries.size() >= kMaxEntries) {
         m_entries.erase(std::min_element(
             m_entries.begin(), m_entries.end(),
             [](const auto& a, const auto& b) { return a.second.expires < b.second.expires; }));

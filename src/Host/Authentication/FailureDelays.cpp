@@ -14,7 +14,7 @@ using std::chrono::milliseconds;
 using std::chrono::minutes;
 using std::chrono::seconds;
 
-constexpr std::size_t kMostRecords = 4096;
+constexpr std::size_t kMaxRecords = 4096;
 constexpr milliseconds kFirstDelay{100};
 constexpr milliseconds kLongestDelay{5000};
 constexpr seconds kLongestWait{10};
@@ -50,7 +50,7 @@ void FailureDelays::failed(const std::string& address, Clock::time_point now) {
     const utils::Mutex::AutoLocker lock(m_mutex);
     std::erase_if(m_records, [&](const auto& each) { return now - each.second.last > kForgetAfter; });
     // An attacker with many addresses must not cost memory; the one quiet for longest matters least.
-    if (m_records.size() >= kMostRecords) {
+    if (m_records.size() >= kMaxRecords) {
         m_records.erase(
             std::min_element(m_records.begin(), m_records.end(),
                              [](const auto& a, const auto& b) { return a.second.last < b.second.last; }));

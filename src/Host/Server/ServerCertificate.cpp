@@ -70,7 +70,7 @@ ServerCertificate::~ServerCertificate() {
 void ServerCertificate::readChain(const std::string& file) {
     std::string pem = readPem(file);
     const gnutls_datum_t data = datumOf(pem);
-    unsigned int count = kMostCertificates;
+    unsigned int count = kMaxCertificates;
     check(::gnutls_pcert_list_import_x509_raw(m_chain, &count, &data, GNUTLS_X509_FMT_PEM, 0), file);
     m_length = count;
 }

@@ -26,14 +26,14 @@ class ServerCertificate {
     gnutls_privkey_t key() const { return m_key; }
 
   private:
-    static constexpr unsigned int kMostCertificates = 8;
+    static constexpr unsigned int kMaxCertificates = 8;
 
     ServerCertificate() = default;
     void readChain(const std::string& file);
     void readKey(const std::string& file);
     void checkPair(const std::string& certificateFile, const std::string& keyFile) const;
 
-    gnutls_pcert_st m_chain[kMostCertificates]{};
+    gnutls_pcert_st m_chain[kMaxCertificates]{};
     unsigned int m_length = 0;
     gnutls_privkey_t m_key = nullptr;
 };

@@ -16,7 +16,7 @@ constexpr std::size_t kMadeManufacturer = 0x60;
 constexpr std::size_t kMadeProduct = 0x70;
 constexpr std::size_t kMadeCode = 0x100;
 constexpr std::size_t kMadeDeviceList = 0x110;
-constexpr std::size_t kMostDeviceIds = 64;
+constexpr std::size_t kMaxDeviceIds = 64;
 constexpr std::uint8_t kFarReturn = 0xCB;
 constexpr std::uint16_t kEfiBootServiceDriver = 11;
 constexpr std::uint16_t kEfiMachineX8664 = 0x8664;
@@ -68,7 +68,7 @@ void putDataStructure(std::span<std::uint8_t> image, const NewRomImage& wanted, 
         writeLe16(data, rom::kPcirClp, kMadeCode);
     if (wanted.furtherDeviceIds.empty()) return;
     writeLe16(data, rom::kPcirDeviceList, kMadeDeviceList - kMadeDataStructure);
-    const std::size_t count = std::min(wanted.furtherDeviceIds.size(), kMostDeviceIds);
+    const std::size_t count = std::min(wanted.furtherDeviceIds.size(), kMaxDeviceIds);
     for (std::size_t index = 0; index < count; ++index)
         writeLe16(image, kMadeDeviceList + 2 * index, wanted.furtherDeviceIds[index]);
 }

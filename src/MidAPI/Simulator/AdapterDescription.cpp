@@ -195,11 +195,11 @@ std::vector<AdapterDescription> parseAdapterDescriptions(std::string_view text,
 }
 
 std::vector<AdapterDescription> loadAdapterDescriptions(const std::string& path) {
-    constexpr std::size_t kMostText = std::size_t{4} * 1024 * 1024;
+    constexpr std::size_t kMaxText = std::size_t{4} * 1024 * 1024;
     // One byte more tells a file that is too long from one that just fits.
-    const auto bytes = readDescriptionFile(path, kMostText + 1);
+    const auto bytes = readDescriptionFile(path, kMaxText + 1);
     if (!bytes) throw AdapterError("there is no adapter description " + path + "; name a readable file");
-    if (bytes->size() > kMostText)
+    if (bytes->size() > kMaxText)
         throw AdapterError("the adapter description " + path + " is longer than 4 MiB");
     std::vector<AdapterDescription> adapters =
         parseAdapterDescriptions(std::string(bytes->begin(), bytes->end()), path);

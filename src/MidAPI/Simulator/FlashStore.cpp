@@ -177,8 +177,8 @@ std::optional<std::vector<std::uint8_t>> FlashStore::bankContent(const FlashStat
 }
 
 std::vector<std::uint8_t> FlashStore::content() const {
-    constexpr int kMostTries = 8;  // each one more takes two whole updates in between
-    for (int attempt = 0; attempt < kMostTries; ++attempt) {
+    constexpr int kMaxTries = 8;  // each one more takes two whole updates in between
+    for (int attempt = 0; attempt < kMaxTries; ++attempt) {
         const std::optional<FlashState> state = storedState();
         if (!state) return m_factoryFlash;
         if (state->active().length == 0) return {};

@@ -42,7 +42,7 @@ std::string folderName(const std::string& name) {
     return result;
 }
 
-constexpr std::size_t kMostFlash = std::size_t{64} * 1024 * 1024;
+constexpr std::size_t kMaxFlash = std::size_t{64} * 1024 * 1024;
 
 [[noreturn]] void refuseFlashFile(const AdapterDescription& adapter, const std::string& why) {
     throw AdapterError("adapter " + adapter.name + ": its flash_file " + adapter.flashFile + " " + why);
@@ -50,9 +50,9 @@ constexpr std::size_t kMostFlash = std::size_t{64} * 1024 * 1024;
 
 std::vector<std::uint8_t> readFlashFile(const AdapterDescription& adapter) try {
     if (adapter.flashFile.empty()) return {};
-    std::optional<std::vector<std::uint8_t>> bytes = os::readWholeFile(adapter.flashFile, kMostFlash + 1);
+    std::optional<std::vector<std::uint8_t>> bytes = os::readWholeFile(adapter.flashFile, kMaxFlash + 1);
     if (!bytes) refuseFlashFile(adapter, "is not there; name an expansion ROM file");
-    if (bytes->size() > kMostFlash) refuseFlashFile(adapter, "is longer than 64 MiB");
+    if (bytes->size() > kMaxFlash) refuseFlashFile(adapter, "is longer than 64 MiB");
     if (const RomFile rom = parseOptionRom(*bytes); rom.error)
         refuseFlashFile(adapter, "is not an intact ROM image: " + *rom.error);
     return *bytes;
