@@ -92,14 +92,20 @@ ExitStatus runVerb(const Arguments& arguments) {
     // After a prompt for the password, at which Ctrl-C is to end the program.
     if (arguments.startsUpdate()) noteInterruptions();
     // A look costs a server a request, and this process nothing.
-    const std::chrono::milliseconds pause(connection.runsJobs ? 50 : 500);
-    const Following following = {[pause] { std::this_thread::sleep_for(pause); },
-                                 [untilTheEnd = connection.runsJobs] {
-                                     return untilTheEnd ? interruptionAsked.exchange(false)
-                                                        : interruptionAsked.load();
-                                 },
-                                 connection.runsJobs};
-    Context context{connection, std::cout, std::cerr, arguments.json, progress, following};
+    const std::chrono::milliseconds pause(connection.isInProcess ? 50 : 500);
+    const Following following = {.pause = [pause] { std::this_thread::sleep_for(pause); },
+                                 .interrupted =
+                                     [untilTheEnd = connection.isInProcess] {
+                                         return untilTheEnd ? interruptionAsked.exchange(false)
+                                                            : interruptionAsked.load();
+                                     },
+                                 .untilTheEnd = connection.isInProcess};
+    Context context{.connection = connection,
+                    .out = std::cout,
+                    .error = std::cerr,
+                    .json = arguments.json,
+                    .progress = progress,
+                    .following = following};
     return arguments.verb(context, arguments.options);
 }
 

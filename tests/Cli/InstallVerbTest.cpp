@@ -103,11 +103,16 @@ class InstallVerbTest : public ::testing::Test {
     ExitStatus install() {
         for (std::ostringstream* stream : {&m_out, &m_error, &m_lines})
             stream->str("");
-        const cli::Connection connection{m_service, true, true};
+        const cli::Connection connection{.operations = m_service, .isInProcess = true, .sharesFiles = true};
         cli::LinePrinter printer(m_lines, {});
         cli::ProgressDisplay progress(printer, [] { return std::chrono::steady_clock::time_point(); });
-        cli::Context context{connection, m_out,    m_error,
-                             false,      progress, {[] {}, [this] { return m_isInterrupted; }}};
+        cli::Context context{
+            .connection = connection,
+            .out = m_out,
+            .error = m_error,
+            .json = false,
+            .progress = progress,
+            .following = {.pause = [] {}, .interrupted = [this] { return m_isInterrupted; }}};
         cli::VerbOptions options;
         options.image.target = "eth0";
         options.image.image = m_file;

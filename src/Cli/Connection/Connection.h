@@ -22,7 +22,7 @@ struct Connection {
     /// Never null. Errors of the model are core::CimError; errors of the way itself are CommandError. Giving
     /// up the last copy unloads the providers of this process, which waits for the updates that have begun.
     std::shared_ptr<core::CimOperations> operations;
-    bool runsJobs = true;     ///< jobs run in this process, so end with it
+    bool isInProcess = true;  ///< the providers run, and their jobs end, with this program
     bool sharesFiles = true;  ///< a path means the same file to this program as to the service
 };
 

@@ -75,7 +75,7 @@ Connection openProviders(const ProviderSettings& settings) {
     selectAdapters(settings);
     loadProviders(session->libraries(), settings.directory);
     // Whoever holds the operations holds the session: the libraries stay as long as somebody may call them.
-    return {{session, session->operations().get()}, true, true};
+    return {.operations = {session, session->operations().get()}, .isInProcess = true, .sharesFiles = true};
 }
 
 }  // namespace cli

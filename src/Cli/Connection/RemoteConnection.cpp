@@ -272,8 +272,10 @@ Connection openServer(const ServerSettings& settings, std::function<bool()> isIn
     }
     const std::string user = settings.user.empty() ? userName() : settings.user;
     const std::string password = passwordOf(user);
-    return {std::make_shared<RemoteOperations>(settings, user, password, std::move(isInterrupted)), false,
-            settings.url->isLoopback()};
+    return {
+        .operations = std::make_shared<RemoteOperations>(settings, user, password, std::move(isInterrupted)),
+        .isInProcess = false,
+        .sharesFiles = settings.url->isLoopback()};
 }
 
 }  // namespace cli

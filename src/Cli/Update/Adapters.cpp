@@ -90,7 +90,7 @@ std::vector<Adapter> readAdapters(core::CimOperations& operations) {
 }
 
 std::string adviceForNoAdapters(const Connection& connection) {
-    if (!connection.runsJobs) return {};
+    if (!connection.isInProcess) return {};
     return "Describe simulated ones in /etc/quenx-adapters.toml, or in a file that --adapters or "
            "QUENX_ADAPTERS names.";
 }

@@ -49,19 +49,24 @@ Candidate makeCandidate(const Connection& connection, const ImageOptions& option
                              findById(*connection.operations, options.identity), options.force);
     }
     requireKnownTypes(*connection.operations, options.types);
-    return compared(connection, {std::move(adapter),
-                                 imageUri(options.image),
-                                 {},
-                                 options.types,
-                                 options.force,
-                                 std::nullopt,
-                                 std::nullopt});
+    return compared(connection, {.adapter = std::move(adapter),
+                                 .uri = imageUri(options.image),
+                                 .identity = {},
+                                 .types = options.types,
+                                 .force = options.force,
+                                 .image = std::nullopt,
+                                 .comparison = std::nullopt});
 }
 
 Candidate makeCandidate(const Connection& connection, Adapter adapter, const InventoryItem& image,
                         bool force) {
-    return compared(connection, {std::move(adapter), image.uri(), image.path, image.types, force,
-                                 std::nullopt, std::nullopt});
+    return compared(connection, {.adapter = std::move(adapter),
+                                 .uri = image.uri(),
+                                 .identity = image.path,
+                                 .types = image.types,
+                                 .force = force,
+                                 .image = std::nullopt,
+                                 .comparison = std::nullopt});
 }
 
 }  // namespace cli

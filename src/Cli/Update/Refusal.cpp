@@ -82,7 +82,7 @@ Reason explainHiddenHolder(std::uint32_t returnValue, const Candidate& candidate
 Reason explainHolder(const Connection& connection, std::uint32_t returnValue, const Candidate& candidate) {
     const bool mayBeHeld =
         returnValue == MethodReturn::InUse || returnValue == MethodReturn::UnspecifiedError;
-    if (!mayBeHeld || connection.runsJobs) return std::nullopt;
+    if (!mayBeHeld || connection.isInProcess) return std::nullopt;
     for (const JobView& job : readJobs(*connection.operations)) {
         if (job.hasEnded()) continue;
         return Explanation{(job.adapter.empty() ? "An adapter" : job.adapter) + " is being updated (" +
@@ -208,7 +208,7 @@ Reason explainImage(const Connection& connection, std::uint32_t returnValue, con
         case MethodReturn::UnspecifiedError:
             return explainFile(candidate);
         case MethodReturn::InvalidParameter:
-            return connection.runsJobs ? explainFile(candidate) : explainServersFile(candidate);
+            return connection.isInProcess ? explainFile(candidate) : explainServersFile(candidate);
         case MethodReturn::UnsupportedTargetType:
             return explainUnsupported(candidate);
         case MethodReturn::DowngradeNotSupported:
@@ -254,7 +254,7 @@ Explanation explainFailedJob(const Connection& connection, const JobView& job, c
                              const std::vector<Component>& after) {
     const std::string reason = job.errorDescription.empty() ? "no reason was given" : job.errorDescription;
     std::string next = readBackText(candidate, after);
-    const std::string advice = connection.runsJobs ? permissionAdvice(reason) : "";
+    const std::string advice = connection.isInProcess ? permissionAdvice(reason) : "";
     if (!next.empty() && !advice.empty()) next += ' ';
     return {"The update of " + candidate.adapter.name + " failed: " + reason + " (error " +
                 std::to_string(job.errorCode) + ").",
@@ -262,7 +262,7 @@ Explanation explainFailedJob(const Connection& connection, const JobView& job, c
 }
 
 std::string adviceAfterCheck(const Connection& connection, const std::string& adapter) {
-    if (connection.runsJobs) return {};
+    if (connection.isInProcess) return {};
     return "The server may now hold " + adapter +
            " and refuse further checks and installs until it is restarted. To prevent that, put "
            "\"ReleaseClaimAfterCheck=1\" into the configuration file of its providers.";

@@ -88,7 +88,7 @@ std::optional<std::uint32_t> verifyOnly(const Connection& connection, const Cand
                 {reference("Source", candidate.identity), reference("Target", candidate.adapter.path)})
             .returnValue;
     }
-    if (!connection.runsJobs) return std::nullopt;
+    if (!connection.isInProcess) return std::nullopt;
     // No method of the model does this; the service's own interface in this process does.
     const core::RequestScope scope;
     auto* check = dynamic_cast<update::ImageCheck*>(core::GetCimBroker()->getInstanceByPath(service));

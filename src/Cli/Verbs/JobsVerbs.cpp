@@ -13,7 +13,7 @@ namespace {
 
 /// Jobs live as long as the process that runs them: this one has none that somebody else could have started.
 std::vector<JobView> jobsOfServer(const Connection& connection) {
-    if (!connection.runsJobs) return readJobs(*connection.operations);
+    if (!connection.isInProcess) return readJobs(*connection.operations);
     throw CommandError(
         ExitStatus::WrongUse,
         "Jobs are kept by a server, and none was named: an update in this program ends with it.",
