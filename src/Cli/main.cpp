@@ -22,15 +22,14 @@ constexpr const char* kAskLog = "The system log has the details.";
 std::atomic<bool> interruptionAsked{false};
 static_assert(std::atomic<bool>::is_always_lock_free, "a signal handler stores it");
 
-/// From here on, Ctrl-C, SIGTERM and a closed terminal do not end the program but are noted, and writing into
-/// a closed pipe is an error and no signal: a program that ends takes an update of its own with it, and is to
-/// say of a server's that it goes on.
+/// An update in this process would die with it, and one on a server goes on unseen: so Ctrl-C is only noted.
 void noteInterruptions() {
     struct sigaction action = {};
     action.sa_handler = [](int) { interruptionAsked = true; };
     action.sa_flags = SA_RESTART;  // a read or write under way is not what the user wants to stop
     for (const int signal : {SIGINT, SIGTERM, SIGHUP})
         sigaction(signal, &action, nullptr);
+    // If the reader of a pipe has gone, writing fails, and the update goes on.
     action.sa_handler = SIG_IGN;
     sigaction(SIGPIPE, &action, nullptr);
 }
@@ -89,9 +88,9 @@ ExitStatus runVerb(const Arguments& arguments) {
     const Connection connection = arguments.server.url
                                       ? openServer(arguments.server, [] { return interruptionAsked.load(); })
                                       : openProviders(arguments.providers);
-    // After a prompt for the password, at which Ctrl-C is to end the program.
+    // Only now: at the prompt for the password, Ctrl-C still ends the program.
     if (arguments.startsUpdate()) noteInterruptions();
-    // A look costs a server a request, and this process nothing.
+    // Polling costs a server a request each time; in process it is free.
     const std::chrono::milliseconds pause(connection.isInProcess ? 50 : 500);
     const Following following = {.pause = [pause] { std::this_thread::sleep_for(pause); },
                                  .interrupted =

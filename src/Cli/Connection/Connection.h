@@ -11,7 +11,7 @@
 
 namespace cli {
 
-/// A request without a usable answer that the server may have carried out all the same.
+/// A request that was sent but got no usable answer: the server may have carried it out.
 class NoAnswer : public CommandError {
   public:
     using CommandError::CommandError;

@@ -74,7 +74,7 @@ Connection openProviders(const ProviderSettings& settings) {
     // The adapters first: providers may ask for them as soon as they are loaded.
     selectAdapters(settings);
     loadProviders(session->libraries(), settings.directory);
-    // Whoever holds the operations holds the session: the libraries stay as long as somebody may call them.
+    // The operations share ownership with the session, so the libraries stay loaded while they can be called.
     return {.operations = {session, session->operations().get()}, .isInProcess = true, .sharesFiles = true};
 }
 

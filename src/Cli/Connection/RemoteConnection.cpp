@@ -170,7 +170,7 @@ IntrinsicResult RemoteOperations::call(const std::string& operation, Parameters 
     request.call = cimxml::IntrinsicCall{operation, m_namespace, std::move(parameters)};
     cimxml::Response response = send(std::move(request), m_namespace);
     auto* result = std::get_if<IntrinsicResult>(&response.content);
-    // A server that answers with a method's response has at least nothing to tell.
+    // If a server answers with a method's response, there is no result to read.
     if (result == nullptr) return {};
     for (core::InstanceValue& instance : result->instances)
         complete(instance.path);

@@ -9,8 +9,8 @@ namespace cli {
 
 namespace {
 
-/// Throws CommandError for a type that the service's capabilities do not name. Any will do where they name
-/// none.
+/// Throws CommandError for a type that the service's capabilities do not name. If they name none, any type is
+/// taken.
 void requireKnownTypes(core::CimOperations& operations, const std::vector<std::string>& types) {
     const auto capabilities = operations.enumerateInstances("Quenx_SoftwareInstallationServiceCapabilities");
     if (capabilities.empty()) return;
@@ -25,7 +25,7 @@ void requireKnownTypes(core::CimOperations& operations, const std::vector<std::s
 }
 
 Candidate compared(const Connection& connection, Candidate candidate) {
-    // On another machine a file of the same path may be there, and be another.
+    // If the service runs on another machine, the same path may name another file.
     const std::optional<std::string> path = localPath(candidate.uri);
     if (!path || !connection.sharesFiles) return candidate;
     candidate.image = readImage(*path);

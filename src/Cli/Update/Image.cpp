@@ -93,7 +93,7 @@ ImageFile readImage(const std::string& path) try {
         image.problem = notAnImage(path, why);
         return image;
     }
-    // Gone since it was looked at, it reads as nothing.
+    // If the file has gone since stat(), nothing can be read.
     const std::optional<std::vector<std::uint8_t>> content = os::readWholeFile(path, kLargestRead);
     if (!content) throw std::system_error(ENOENT, std::generic_category());
     image.rom = ma::parseOptionRom(*content);

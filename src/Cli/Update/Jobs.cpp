@@ -50,8 +50,7 @@ JobView viewOf(const core::InstanceValue& job) {
 }
 
 JobView lookAt(core::CimOperations& operations, const core::CimPath& job, const Following& following) {
-    // A connection can break, or the server be busy, and the update goes on all the same: so many looks in a
-    // row may fail.
+    // The update survives a broken connection, so give up only after this many failures in a row.
     constexpr unsigned kMaxFailures = 20;
     std::string reason;
     for (unsigned failures = 0; failures < kMaxFailures; ++failures) {

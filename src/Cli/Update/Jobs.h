@@ -45,7 +45,8 @@ std::vector<JobView> readJobs(core::CimOperations& operations);
 struct Following {
     std::function<void()> pause;        ///< between two looks at the job
     std::function<bool()> interrupted;  ///< whether the user asked to stop since the last time
-    bool untilTheEnd = true;  ///< an interruption does not end it: the update would end with this program
+    /// If the update would end with this program, an interruption does not end the following.
+    bool untilTheEnd = true;
 };
 
 /// Looks at the job until it has ended and shows its progress.

@@ -77,8 +77,8 @@ Reason explainHiddenHolder(std::uint32_t returnValue, const Candidate& candidate
                        kWaitOrRestart};
 }
 
-/// Who holds the adapter: a service that serves another one answers as to an image that it cannot read. In
-/// process there is nobody else.
+/// Who holds the adapter. If the service is busy with another adapter, it answers as it does for an image
+/// that it cannot read. In process, nobody else can hold it.
 Reason explainHolder(const Connection& connection, std::uint32_t returnValue, const Candidate& candidate) {
     const bool mayBeHeld =
         returnValue == MethodReturn::InUse || returnValue == MethodReturn::UnspecifiedError;
@@ -127,7 +127,7 @@ std::string getImageFor(const Adapter& adapter) {
 
 Reason explainUnsupported(const Candidate& candidate) {
     const Adapter& adapter = candidate.adapter;
-    // First of all: such an adapter takes no image, whatever its ids.
+    // Checked first: if the adapter cannot be updated, its ids do not matter.
     if (!adapter.updatable) {
         return Explanation{"The firmware of " + adapter.name + " cannot be updated.",
                            "\"quenxctl adapters\" shows which adapters can be updated."};
@@ -225,7 +225,7 @@ std::string readBackText(const Candidate& candidate, const std::vector<Component
     const std::vector<Component>& before = candidate.adapter.components;
     if (after.empty() || before.empty()) return {};
     if (after != before) return "It now has " + componentsText(after) + ".";
-    // Had the image the versions that were there, the same versions show nothing.
+    // If the image has the versions that were there, reading them back shows nothing.
     const bool isTelling = candidate.comparison && !candidate.comparison->current;
     return isTelling ? "It keeps its old firmware." : "It reports the same versions as before.";
 }

@@ -19,7 +19,7 @@ core::CimPath findService(core::CimOperations& operations) try {
     }
     return services.front();
 } catch (const NoAnswer& error) {
-    // Nobody shall take it for an update that may have begun.
+    // No update was asked for yet, so this must not read as one that may have begun.
     throw CommandError(error.status(), error.what(), error.advice());
 }
 

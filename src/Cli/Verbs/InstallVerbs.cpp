@@ -17,7 +17,7 @@ struct Outcome {
         : adapter(candidate.adapter.name),
           uri(candidate.uri),
           before(candidate.adapter.components),
-          after(candidate.adapter.components) {}
+          after(before) {}
 
     void end(ExitStatus with, const std::string& how, const std::string& what) {
         status = with;
@@ -28,7 +28,7 @@ struct Outcome {
         end(why.status, how, why.message);
         advice = why.advice;
     }
-    /// For a person: not found is a failure, already current is none.
+    /// For a person: if the adapter is already current, nothing has failed.
     bool isFailure() const { return status != ExitStatus::Done && status != ExitStatus::AlreadyCurrent; }
 
     ExitStatus status = ExitStatus::Failed;
@@ -40,7 +40,7 @@ struct Outcome {
     std::optional<std::uint32_t> returnValue;  ///< of the method, when it was called
     std::optional<JobView> job;                ///< when one was started
     std::vector<Component> before;
-    std::vector<Component> after;  ///< empty when that could not be read
+    std::vector<Component> after;  ///< as before until something is written; empty if it cannot be read
 };
 
 void to_json(Json& json, const Outcome& outcome) {
@@ -93,7 +93,7 @@ void endAsCurrent(Outcome& outcome, const Candidate& candidate) {
                     componentsText(candidate.comparison->chosen) + ".");
 }
 
-/// An update that says it completed and left the old versions has not.
+/// If the adapter still has the old versions, the update did not complete, although the service says so.
 bool isInPlace(const Candidate& candidate, const std::vector<Component>& after) {
     if (!candidate.comparison || after.empty()) return true;
     const std::vector<Component>& chosen = candidate.comparison->chosen;
@@ -174,13 +174,13 @@ std::optional<core::MethodResult> start(Context& context, const Candidate& candi
 ExitStatus installUnlessInterrupted(Context& context, const ImageOptions& image) {
     const Candidate candidate = makeCandidate(context.connection, image);
     Outcome outcome(candidate);
-    // Found out here: the service would write the same image again.
+    // Checked here: the service would write the same image again.
     if (!candidate.force && candidate.isAlreadyCurrent()) {
         endAsCurrent(outcome, candidate);
         outcome.advice = "Use --force to write it again.";
         return print(context, outcome);
     }
-    // The last moment to stop: nobody can once the service has been called.
+    // The last moment to stop: once the service is called, nobody can.
     if (context.following.interrupted()) throw CommandError(ExitStatus::Interrupted, "Interrupted.", "");
     const std::optional<core::MethodResult> result = start(context, candidate, outcome);
     if (!result) return print(context, outcome);
@@ -209,7 +209,7 @@ ExitStatus check(Context& context, const VerbOptions& options) {
     const Connection& connection = context.connection;
     Candidate candidate = makeCandidate(connection, options.image);
     std::optional<std::uint32_t> returnValue = verifyOnly(connection, candidate);
-    // A server, which only checks identities: find the one that the file belongs to.
+    // If a server cannot check a file, it can check the identity that the file belongs to.
     if (!returnValue) {
         if (options.image.force || !options.image.types.empty()) {
             throw CommandError(ExitStatus::WrongUse, "A check on a server takes neither --types nor --force.",

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// What there is: adapters, and software identities.
+// Listing adapters and software identities.
 #include "Cli/Display/Output.h"
 #include "Cli/Update/Inventory.h"
 #include "Cli/Verbs/Verbs.h"

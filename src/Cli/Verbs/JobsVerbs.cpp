@@ -11,7 +11,7 @@ namespace cli {
 
 namespace {
 
-/// Jobs live as long as the process that runs them: this one has none that somebody else could have started.
+/// Jobs end with the process that runs them, so only a server can have any that were started before.
 std::vector<JobView> jobsOfServer(const Connection& connection) {
     if (!connection.isInProcess) return readJobs(*connection.operations);
     throw CommandError(

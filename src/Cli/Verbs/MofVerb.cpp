@@ -33,7 +33,7 @@ std::string qualifierText(const core::Qualifier& qualifier) {
 std::string qualifierList(const std::vector<core::Qualifier>& qualifiers, const std::string& indent) {
     std::vector<std::string> texts;
     for (const core::Qualifier& qualifier : qualifiers) {
-        // What is inherited would be an override here, which some qualifiers do not allow.
+        // If an inherited qualifier were repeated, it would override, which some do not allow.
         if (!qualifier.isPropagated) texts.push_back(qualifierText(qualifier));
     }
     if (texts.empty()) return {};

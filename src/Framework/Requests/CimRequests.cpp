@@ -37,7 +37,8 @@ struct CallLists {
     CimPropertyList out;
 };
 
-/// A value that the client gives for an output parameter goes to the method with the outputs: it decides.
+/// A value that the client gives for an output parameter goes to the method with the outputs: the method
+/// decides what to do with it.
 CallLists listsFor(const MethodDeclaration& method, const std::vector<Argument>& arguments) {
     CallLists lists;
     for (const ParameterDeclaration& parameter : method.parameters) {

@@ -48,7 +48,8 @@ class ServedClasses {
 /// Runs the body of a request on what is served; it fails with CimError only.
 template <class Body>
 auto answerRequest(Body&& body) {
-    // Outlives what a provider throws: the type of an exception goes with its library.
+    // Declared first: it keeps the provider's library, and with it the type of what it throws, loaded until
+    // the exception is converted.
     const ServedClasses classes;
     return withCimErrors([&] { return body(classes); });
 }

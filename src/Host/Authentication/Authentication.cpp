@@ -57,7 +57,7 @@ AuthenticationResult Authentication::authenticate(const std::optional<std::strin
     const auto credentials = header ? readBasicHeader(*header) : std::nullopt;
     if (!credentials) return {AuthenticationOutcome::Missing, {}};
     const auto known = m_cache.find(*credentials, FailureDelays::keyOf(address));
-    // Whoever guesses passwords shall not keep those out who share the address and know theirs.
+    // If somebody guesses passwords, other users of the same address must still get in.
     if (!known && !waitForTurn(address)) return {AuthenticationOutcome::Busy, {}};
     std::optional<User> user;
     if (known && known->isFresh) {

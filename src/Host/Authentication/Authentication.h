@@ -135,7 +135,7 @@ class Authentication {
     /// is then as before.
     void reload();
 
-    /// Lets go of everybody who waits, and refuses whoever would.
+    /// Releases everybody who waits; if somebody would wait from now on, they are refused.
     void stop();
 
   private:

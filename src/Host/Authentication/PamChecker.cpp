@@ -56,7 +56,7 @@ class PamSession {
     bool authenticate() {
         constexpr int kFlags = PAM_SILENT | PAM_DISALLOW_NULL_AUTHTOK;
         if (m_status == PAM_SUCCESS) m_status = ::pam_authenticate(m_handle, kFlags);
-        // The password may be right and the account expired or locked all the same.
+        // Even if the password is right, the account may have expired or be locked.
         if (m_status == PAM_SUCCESS) m_status = ::pam_acct_mgmt(m_handle, kFlags);
         return m_status == PAM_SUCCESS;
     }

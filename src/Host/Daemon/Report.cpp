@@ -43,7 +43,7 @@ void notifyServiceManager(const std::string& state) {
     std::memcpy(address.sun_path, path, length);
     // A leading @ stands for the NUL of the abstract namespace.
     if (address.sun_path[0] == '@') address.sun_path[0] = '\0';
-    // Two calls and no reply do not need the library of systemd, which is missing where there is no systemd.
+    // Without the library of systemd: if there is no systemd, it is missing, and two calls do the same.
     const int socket = ::socket(AF_UNIX, SOCK_DGRAM | SOCK_CLOEXEC, 0);
     if (socket < 0) return;
     ::sendto(socket, state.data(), state.size(), MSG_NOSIGNAL, reinterpret_cast<const sockaddr*>(&address),

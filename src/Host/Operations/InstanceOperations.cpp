@@ -14,8 +14,8 @@ using core::CimStatus;
 
 const core::PropertyFilter kNoProperties{std::vector<std::string>()};
 
-/// The properties of the named class only, narrowed by the client's list: what subclasses add is left out.
-/// The instances are those of the subclasses all the same (DSP0200 5.4.2.4).
+/// The properties of the named class only, narrowed by the client's list. Instances of subclasses are
+/// answered too, without the properties that the subclasses add (DSP0200 5.4.2.4).
 core::PropertyFilter shallowFilter(const core::ClassChain& chain, const core::PropertyFilter& wanted) {
     std::vector<std::string> names;
     for (const auto& declaration : chain) {

@@ -50,15 +50,15 @@ CimPath InteropNamespace::typedOwnPath(const CimPath& path) const {
 
 bool InteropNamespace::isShown(const core::ClassChain& chain) const {
     return std::any_of(kShown.begin(), kShown.end(), [&](const char* shown) {
-        // A superclass of what is shown is shown as well: a client reads its declaration.
+        // If a class is shown, so are its superclasses: a client reads their declarations.
         return core::derivesFrom(chain, shown) ||
                core::derivesFrom(m_implementation->getClass(shown), chain.front()->name);
     });
 }
 
 std::vector<std::string> InteropNamespace::sources(const std::string& className) const {
-    // Either the class itself, or, for a superclass such as CIM_ManagedElement, what is shown below it: the
-    // providers have much below it that is not shown.
+    // If the class is a superclass such as CIM_ManagedElement, the shown classes below it: the providers have
+    // others below it that are not shown.
     const core::ClassChain chain = m_implementation->getClass(className);
     std::vector<std::string> names;
     for (const char* shown : kShown) {

@@ -52,8 +52,8 @@ class InteropNamespace : public core::CimOperations {
     bool isShown(const core::ClassChain& chain) const;
     /// The providers' classes to enumerate for the instances of a class here.
     std::vector<std::string> sources(const std::string& className) const;
-    /// Whether associations may lead from the path through the filter: none do from and to what is the
-    /// manager's own. CimError when the path or the filter is wrong.
+    /// Whether associations may lead from the path through the filter. If the path or the filter names one of
+    /// the manager's own classes, none do. CimError when the path or the filter is wrong.
     bool hasAssociations(const core::CimPath& path, const core::AssociationFilter& by) const;
 
     void relocate(core::CimPath& path) const;

@@ -23,7 +23,7 @@ using core::CimValue;
     throw CimError(CimStatus::InvalidEnumerationContext, "no enumeration of that context is open");
 }
 
-/// A name that nobody can guess: whoever knows it and the user can read what is left.
+/// A name that nobody can guess: if a client of the same user knew it, it could read the rest.
 std::string newContext() {
     std::array<unsigned char, 16> bytes{};
     if (::getrandom(bytes.data(), bytes.size(), 0) != static_cast<ssize_t>(bytes.size())) {
@@ -102,7 +102,7 @@ IntrinsicResult OpenEnumerations::open(const EnumerationOwner& owner, IntrinsicR
     // A result that fits into the first answer is never kept, and counts against no limit.
     const std::string context = newContext();
     const utils::Mutex::AutoLocker lock(m_mutex);
-    // Checked last, when the work is done: it is the memory of what is left that has to be bounded.
+    // Checked last: only a result that is kept takes memory that needs a bound.
     dropExpired();
     if (m_entries.size() >= m_limits.open) {
         throw CimError(CimStatus::ServerLimitsExceeded, "too many enumerations are open");

@@ -20,8 +20,8 @@ struct EnumerationOwner {
     bool operator==(const EnumerationOwner&) const = default;
 };
 
-/// The enumerations that clients have opened and not yet read to the end. They hold values, so that an
-/// instance that goes meanwhile is no concern. Thread-safe. All errors are CimError.
+/// The enumerations that clients have opened and not yet read to the end. They hold values, so if an instance
+/// is deleted meanwhile, it is still read. Thread-safe. All errors are CimError.
 class OpenEnumerations {
   public:
     using Clock = std::chrono::steady_clock;

@@ -119,12 +119,12 @@ std::optional<HttpAnswer> HttpRequest::authenticate() {
 }
 
 MHD_Result HttpRequest::begin() {
-    // A client that may not is told before it sends a megabyte.
+    // If a client may not send its body, it is told before it sends a megabyte.
     m_refusal = checkHead(m_head, m_server.m_limits.bodyBytes);
     if (!m_refusal) m_refusal = authenticate();
     m_server.m_watch->allow(m_socket, m_server.m_limits.requestTime);
     if (!m_refusal) {
-        // What is announced may never come, so no more than this is set aside on trust.
+        // If a client announces a large body and sends none, only this much memory is wasted.
         m_body.reserve(std::min<std::size_t>(*contentLengthOf(m_head), std::size_t{1} << 16));
         return MHD_YES;
     }
@@ -136,7 +136,7 @@ MHD_Result HttpRequest::begin() {
 }
 
 void HttpRequest::take(const char* data, std::size_t size) {
-    // The library goes on handing over what comes; of a refused body nothing is kept.
+    // If the request was refused, the library still hands over its body, which is dropped.
     if (!m_refusal) m_body.append(data, size);
 }
 
