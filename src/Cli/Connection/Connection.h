@@ -69,9 +69,8 @@ struct ServerSettings {
 /// on standard error of what gives the password away. The password is QUENXCTL_PASSWORD, else asked for on
 /// the terminal. Throws CommandError where nobody can answer.
 /// @param settings       with a URL
-/// @param isInterrupted  asked about once a second while an answer is waited for; true gives the request up
-/// by
-///                       a CommandError with ExitStatus::Interrupted
+/// @param isInterrupted  asked about once a second while an answer is waited for; true ends the request with
+///                       a CommandError of ExitStatus::Interrupted
 Connection openServer(const ServerSettings& settings, std::function<bool()> isInterrupted);
 
 }  // namespace cli

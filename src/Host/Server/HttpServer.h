@@ -70,8 +70,8 @@ class HttpServer {
     Slots m_workers;
     std::atomic<unsigned int> m_inFlight{0};
     std::atomic<bool> m_stopping{false};
-    std::vector<std::shared_ptr<const ServerCertificate>>
-        m_certificates;  ///< a handshake may still use an old one
+    /// All so far: a handshake may still use an old one.
+    std::vector<std::shared_ptr<const ServerCertificate>> m_certificates;
     std::unique_ptr<ConnectionWatch> m_watch;
     std::vector<MHD_Daemon*> m_daemons;
 };

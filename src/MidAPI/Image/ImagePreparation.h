@@ -26,9 +26,10 @@ struct PreparationTarget {
 struct Preparation {
     PrepareStatus status = PrepareStatus::Prepared;
     std::string reason;  ///< a sentence for people; empty for PrepareStatus::Prepared
-    std::vector<RomImage>
-        chosen;  ///< the images to write; filled for PrepareStatus::Prepared and the two that force allows
-    std::vector<utils::FirmwareType> types;  ///< of those, ascending
+    /// The images to write; filled for PrepareStatus::Prepared and the two that force allows.
+    std::vector<RomImage> chosen;
+    /// Of those, ascending.
+    std::vector<utils::FirmwareType> types;
 };
 
 /// Holds an image file against an adapter, without writing anything: which images of `requested` types (type

@@ -24,16 +24,17 @@ struct QUENX_EXPORT RomImage {
     std::uint32_t dataStructure = 0;  ///< offset of the PCI data structure from the start of the image, bytes
     std::uint16_t vendorId = 0;
     std::uint16_t deviceId = 0;
-    std::vector<std::uint16_t>
-        furtherDeviceIds;       ///< of the same vendor; only data structures of revision 3 have them
+    /// Of the same vendor; only data structures of revision 3 have them.
+    std::vector<std::uint16_t> furtherDeviceIds;
     std::uint8_t codeType = 0;  ///< one of RomCodeType, or a value not known here
     std::uint16_t codeRevision = 0;
     std::uint32_t classCode = 0;  ///< 24 bits: base class, subclass, programming interface
     bool last = false;
     std::uint16_t clpEntry = 0;  ///< offset of the DMTF CLP entry point, 0 for none
-    std::string
-        manufacturer;     ///< from the Plug and Play expansion headers; printable, at most 255 characters
-    std::string product;  ///< likewise; where a chain of headers names several, the one that tells the type
+    /// From the Plug and Play expansion headers; printable, at most 255 characters.
+    std::string manufacturer;
+    /// Likewise. If a chain of headers names several, the one that tells the type.
+    std::string product;
 
     /// What the image boots: IMG_UEFI for code type 3; for code type 0 IMG_iSCSI or IMG_FCoE when a product
     /// name says so, otherwise IMG_PXE; type 0 for code that no port of this system runs.
