@@ -87,7 +87,7 @@ std::vector<std::string> typesOf(std::string text) {
 }
 
 /// What install and check have in common. Returns the option for an identity, which says its types itself.
-CLI::Option* addImageOptions(CLI::App& verb, ImageOptions& options, const char* imageText) {
+CLI::Option* addUpdateOptions(CLI::App& verb, UpdateOptions& options, const char* imageText) {
     addValue(verb, "--target", options.target, "ADAPTER", "Adapter: its name, PCI address or object path")
         ->required();
     addValue(verb, "image", options.image, "URI", imageText);
@@ -111,11 +111,11 @@ CLI::App* addVerb(CLI::App& app, Arguments& arguments, const char* name, Verb ve
 }
 
 void addImageVerbs(CLI::App& app, Arguments& arguments) {
-    ImageOptions& options = arguments.options.image;
+    UpdateOptions& options = arguments.options.update;
     CLI::App* verb = addVerb(
         app, arguments, "check", check,
         "Say whether an image could be installed, without writing it (a server may hold the adapter)");
-    CLI::Option* identity = addImageOptions(
+    CLI::Option* identity = addUpdateOptions(
         *verb, options, "Image: a path or a file URI; with --server only one that \"identities\" lists");
     verb->add_flag("--force", options.force, "Check whether it could be installed with --force")
         ->excludes(identity);
@@ -124,7 +124,7 @@ void addImageVerbs(CLI::App& app, Arguments& arguments) {
     verb = addVerb(app, arguments, "install", install,
                    "Install a firmware image on an adapter and wait until it is done");
     verb->alias("update");
-    addImageOptions(*verb, options, "Image: a path or a file URI");
+    addUpdateOptions(*verb, options, "Image: a path or a file URI");
     verb->add_flag("--force", options.force,
                    "Also install an older image, the same one again, or one with other image types");
     verb->footer("An update that has begun always runs to its end: Ctrl-C does not stop it.");
@@ -259,9 +259,9 @@ CommandError wrongUse(const CLI::App& app, const CLI::ParseError& error) {
 
 /// The library can exclude one option by another, but not require one of two.
 void requireOneImage(const CLI::App& app, const Arguments& arguments) {
-    const ImageOptions& image = arguments.options.image;
+    const UpdateOptions& update = arguments.options.update;
     const bool takesImage = arguments.verb == install || arguments.verb == check;
-    if (!takesImage || image.image.empty() != image.identity.empty()) return;
+    if (!takesImage || update.image.empty() != update.identity.empty()) return;
     throw CommandError(ExitStatus::WrongUse, "Name one image, either as a file or with --identity.",
                        askHelpOf(*app.get_subcommands().front()));
 }

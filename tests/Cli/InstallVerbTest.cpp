@@ -114,8 +114,8 @@ class InstallVerbTest : public ::testing::Test {
             .progress = progress,
             .following = {.pause = [] {}, .interrupted = [this] { return m_isInterrupted; }}};
         cli::VerbOptions options;
-        options.image.target = "eth0";
-        options.image.image = m_file;
+        options.update.target = "eth0";
+        options.update.image = m_file;
         return cli::install(context, options);
     }
 

@@ -42,7 +42,7 @@ bool Candidate::isAlreadyCurrent() const {
            comparison->missing.empty() && adapter.updatable;
 }
 
-Candidate makeCandidate(const Connection& connection, const ImageOptions& options) {
+Candidate makeCandidate(const Connection& connection, const UpdateOptions& options) {
     Adapter adapter = findAdapter(connection, options.target);
     if (!options.identity.empty()) {
         return makeCandidate(connection, std::move(adapter),

@@ -12,7 +12,7 @@
 namespace cli {
 
 /// The image and the adapter of an update or a check, as the user names them.
-struct ImageOptions {
+struct UpdateOptions {
     std::string target;
     std::string image;               ///< a path or a URI; empty with an identity
     std::string identity;            ///< empty with an image
@@ -36,7 +36,7 @@ struct Candidate {
 
 /// Finds adapter and image, and compares them when the image is a file that this program can read. Throws
 /// CommandError for an adapter, identity or image type that there is not.
-Candidate makeCandidate(const Connection& connection, const ImageOptions& options);
+Candidate makeCandidate(const Connection& connection, const UpdateOptions& options);
 Candidate makeCandidate(const Connection& connection, Adapter adapter, const InventoryItem& image,
                         bool force);
 

@@ -171,8 +171,8 @@ std::optional<core::MethodResult> start(Context& context, const Candidate& candi
 }
 
 /// Throws CommandError with ExitStatus::Interrupted only while nothing has been started.
-ExitStatus installUnlessInterrupted(Context& context, const ImageOptions& image) {
-    const Candidate candidate = makeCandidate(context.connection, image);
+ExitStatus installUnlessInterrupted(Context& context, const UpdateOptions& options) {
+    const Candidate candidate = makeCandidate(context.connection, options);
     Outcome outcome(candidate);
     // Checked here: the service would write the same image again.
     if (!candidate.force && candidate.isAlreadyCurrent()) {
@@ -197,7 +197,7 @@ ExitStatus installUnlessInterrupted(Context& context, const ImageOptions& image)
 
 ExitStatus install(Context& context, const VerbOptions& options) {
     try {
-        return installUnlessInterrupted(context, options.image);
+        return installUnlessInterrupted(context, options.update);
     } catch (const CommandError& error) {
         if (error.status() != ExitStatus::Interrupted) throw;
         throw CommandError(ExitStatus::Interrupted,
@@ -207,16 +207,16 @@ ExitStatus install(Context& context, const VerbOptions& options) {
 
 ExitStatus check(Context& context, const VerbOptions& options) {
     const Connection& connection = context.connection;
-    Candidate candidate = makeCandidate(connection, options.image);
+    Candidate candidate = makeCandidate(connection, options.update);
     std::optional<std::uint32_t> returnValue = verifyOnly(connection, candidate);
     // If a server cannot check a file, it can check the identity that the file belongs to.
     if (!returnValue) {
-        if (options.image.force || !options.image.types.empty()) {
+        if (options.update.force || !options.update.types.empty()) {
             throw CommandError(ExitStatus::WrongUse, "A check on a server takes neither --types nor --force.",
                                "Leave them out, or check without --server.");
         }
         candidate = makeCandidate(connection, std::move(candidate.adapter),
-                                  findByFile(*connection.operations, options.image.image), false);
+                                  findByFile(*connection.operations, options.update.image), false);
         returnValue = verifyOnly(connection, candidate);
     }
     Outcome outcome(candidate);

@@ -26,7 +26,7 @@ struct Context {
 
 /// The options and arguments of all verbs; each verb looks at its own.
 struct VerbOptions {
-    ImageOptions image;              ///< install, check
+    UpdateOptions update;            ///< install, check
     std::string job;                 ///< delete: its id, the number at the end of that, or its path
     std::string className;           ///< instances
     std::string path;                ///< associators
