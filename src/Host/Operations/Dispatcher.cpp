@@ -30,7 +30,7 @@ core::CimOperations& Dispatcher::findNamespace(const std::string& name) const {
     throw CimError(CimStatus::InvalidNamespace, "no namespace \"" + name + "\"");
 }
 
-IntrinsicResult Dispatcher::call(const cimxml::IntrinsicCall& call, const Caller& caller) {
+IntrinsicResult Dispatcher::callOperation(const cimxml::IntrinsicCall& call, const Caller& caller) {
     const Operation* operation = findOperation(call.operation);
     if (operation != nullptr) requirePrivilege(operation->privilege, caller);
     // The namespace before the operation: clients probe for namespaces with whatever operation they like.
@@ -41,7 +41,7 @@ IntrinsicResult Dispatcher::call(const cimxml::IntrinsicCall& call, const Caller
     return operation->handler({target, caller, m_enumerations}, Parameters(call, operation->parameters));
 }
 
-core::MethodResult Dispatcher::call(const cimxml::MethodCall& call, const Caller& caller) {
+core::MethodResult Dispatcher::callMethod(const cimxml::MethodCall& call, const Caller& caller) {
     // Before anything else, so that a reader learns nothing of what there is to call.
     requirePrivilege(kMethodPrivilege, caller);
     core::CimOperations& target = findNamespace(call.object.getNamespace());
@@ -63,9 +63,9 @@ cimxml::Response Dispatcher::dispatch(const cimxml::Request& request, const Call
             throw CimError(CimStatus::ServerIsShuttingDown, "the server is shutting down");
         }
         if (const auto* method = std::get_if<cimxml::MethodCall>(&request.call)) {
-            response.content = call(*method, caller);
+            response.content = callMethod(*method, caller);
         } else {
-            response.content = call(std::get<cimxml::IntrinsicCall>(request.call), caller);
+            response.content = callOperation(std::get<cimxml::IntrinsicCall>(request.call), caller);
         }
     } catch (const CimError& error) {
         response.content = ErrorResult{error.status(), error.what()};

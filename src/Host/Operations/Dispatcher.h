@@ -25,8 +25,8 @@ class Dispatcher {
     void shutDown() { m_shuttingDown.store(true); }
 
   private:
-    cimxml::IntrinsicResult call(const cimxml::IntrinsicCall& call, const Caller& caller);
-    core::MethodResult call(const cimxml::MethodCall& call, const Caller& caller);
+    cimxml::IntrinsicResult callOperation(const cimxml::IntrinsicCall& call, const Caller& caller);
+    core::MethodResult callMethod(const cimxml::MethodCall& call, const Caller& caller);
     core::CimOperations& findNamespace(const std::string& name) const;
 
     const Namespaces m_namespaces;
