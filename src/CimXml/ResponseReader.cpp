@@ -130,8 +130,9 @@ IntrinsicResult readIntrinsic(const std::vector<pugi::xml_node>& parts) {
     return result;
 }
 
-core::MethodResult readExtrinsic(const std::vector<pugi::xml_node>& parts) {
+core::MethodResult readExtrinsic(const pugi::xml_node& element, const std::vector<pugi::xml_node>& parts) {
     core::MethodResult result;
+    bool hasReturned = false;
     for (const pugi::xml_node& part : parts) {
         if (!isElement(part, "RETURNVALUE")) {
             result.outputs.push_back(readOutput(part));
@@ -141,7 +142,10 @@ core::MethodResult readExtrinsic(const std::vector<pugi::xml_node>& parts) {
         const auto type = core::typeByName(part.attribute("PARAMTYPE").value());
         result.returnType = type.value_or(core::CimType::Uint32);
         result.returnValue = readNumber(part, textOf(onlyChild(part)));
+        hasReturned = true;
     }
+    // Only void methods return without a value (DSP0203), and this schema has none.
+    if (!hasReturned) refuseElement(element, "has no RETURNVALUE");
     return result;
 }
 
@@ -159,7 +163,7 @@ Response readResponse(std::string_view bytes) {
     if (!parts.empty() && isElement(parts.front(), "ERROR")) {
         response.content = readError(parts.front());
     } else if (response.isMethod) {
-        response.content = readExtrinsic(parts);
+        response.content = readExtrinsic(envelope.content, parts);
     } else {
         response.content = readIntrinsic(parts);
     }

@@ -72,6 +72,7 @@ TEST(ResponseReaderTest, RefusesWhatIsNoResponse) {
          {std::string("<html/>"), inside(""), inside("<IMETHODCALL NAME='X'/>"),
           inside("<IMETHODRESPONSE NAME='X'><ERROR CODE='six'/></IMETHODRESPONSE>"),
           inside("<IMETHODRESPONSE NAME='X'><IRETURNVALUE><NEW/></IRETURNVALUE></IMETHODRESPONSE>"),
+          inside("<METHODRESPONSE NAME='X'></METHODRESPONSE>"),
           inside("<METHODRESPONSE NAME='X'><RETURNVALUE><VALUE>x</VALUE></RETURNVALUE></METHODRESPONSE>"),
           inside("<IMETHODRESPONSE NAME='X'><IRETURNVALUE><INSTANCE CLASSNAME='C'><PROPERTY NAME='P' "
                  "TYPE='uint8'><VALUE>300</VALUE></PROPERTY></INSTANCE></IRETURNVALUE></IMETHODRESPONSE>")}) {

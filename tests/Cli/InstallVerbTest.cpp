@@ -50,6 +50,7 @@ class FakeService : public core::CimOperations {
     std::deque<InstanceValue> jobs = {job(3, 0), job(4, 40), job(7, 100)};  ///< one a look
     unsigned unanswered = 0;                                                ///< so many looks get no answer
     bool isCalled = false;
+    bool needsJob = true;
     bool answersTheCall = true;
     bool isReadable = true;  ///< what is installed, after the job
 
@@ -87,6 +88,8 @@ class FakeService : public core::CimOperations {
                                     const std::vector<core::Argument>&) override {
         isCalled = true;
         if (!answersTheCall) throw cli::NoAnswer(ExitStatus::Failed, "No answer.", "Wait.");
+        if (!needsJob) installed = installedAfterJob;
+        if (!needsJob) return {0, {}};
         return {4096, {{"Job", CimValue::of(CimType::Reference, job(2, 0).path)}}};
     }
     void deleteInstance(const CimPath&) override {}
@@ -160,6 +163,14 @@ TEST_F(InstallVerbTest, BelievesNoSuccessThatCannotBeSeen) {
     m_service->jobs = {job(4, 100), job(10, 100)};
     EXPECT_EQ(install(), ExitStatus::Failed);
     EXPECT_EQ(m_lines.str(), "eth0: 0 %, 0 B of 2.0 KiB\neth0: 99 %, 2.0 KiB of 2.0 KiB\n");
+}
+
+TEST_F(InstallVerbTest, TakesAnUpdateWithoutAJobForWhatItDid) {
+    m_service->needsJob = false;
+    EXPECT_EQ(install(), ExitStatus::Done);
+    EXPECT_EQ(m_out.str(), "eth0 was updated.\n  IMG_PXE   1 -> 2\n  IMG_UEFI  0 -> 1\n");
+    m_service->installed = m_service->installedAfterJob = kOld;
+    EXPECT_EQ(install(), ExitStatus::Failed);
 }
 
 TEST_F(InstallVerbTest, ChangesNothingWhenInterruptedBeforeTheStart) {

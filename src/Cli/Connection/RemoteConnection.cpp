@@ -83,6 +83,15 @@ void requireOk(const HttpReply& reply) {
     }
 }
 
+[[noreturn]] void refuseAnswer(const std::string& why) {
+    throw NoAnswer(ExitStatus::Failed, why, "Check that --server names a CIM-XML server.");
+}
+
+void requireAnswerTo(const cimxml::Request& request, const cimxml::Response& response) {
+    if (response.messageId != request.messageId || !core::sameName(response.name, request.name()))
+        refuseAnswer("The server's answer belongs to another request.");
+}
+
 /// What a server answers over CIM-XML.
 class RemoteOperations : public core::CimOperations {
   public:
@@ -144,7 +153,7 @@ class RemoteOperations : public core::CimOperations {
 };
 
 cimxml::Response RemoteOperations::send(cimxml::Request request, const std::string& object) {
-    // Tells the answers of one client apart in a server's trace (DSP0201).
+    // Tells to which request an answer belongs (DSP0201).
     request.messageId = std::to_string(++m_messages);
     // Without the empty "Expect:", a large body waits a second for servers that do not answer it.
     const HttpReply reply = m_client.post(
@@ -155,13 +164,12 @@ cimxml::Response RemoteOperations::send(cimxml::Request request, const std::stri
     requireOk(reply);
     try {
         cimxml::Response response = cimxml::readResponse(reply.body);
+        requireAnswerTo(request, response);
         if (const auto* error = std::get_if<cimxml::ErrorResult>(&response.content))
             throw core::CimError(error->status, error->description);
         return response;
     } catch (const cimxml::WireError& error) {
-        throw NoAnswer(ExitStatus::Failed,
-                       std::string("The server's answer cannot be read: ") + error.what() + ".",
-                       "Check that --server names a CIM-XML server.");
+        refuseAnswer(std::string("The server's answer cannot be read: ") + error.what() + ".");
     }
 }
 
@@ -170,8 +178,7 @@ IntrinsicResult RemoteOperations::call(const std::string& operation, Parameters 
     request.call = cimxml::IntrinsicCall{operation, m_namespace, std::move(parameters)};
     cimxml::Response response = send(std::move(request), m_namespace);
     auto* result = std::get_if<IntrinsicResult>(&response.content);
-    // If a server answers with a method's response, there is no result to read.
-    if (result == nullptr) return {};
+    if (result == nullptr) refuseAnswer("The server's answer is not that of an operation.");
     for (core::InstanceValue& instance : result->instances)
         complete(instance.path);
     for (core::CimPath& path : result->paths)
@@ -202,7 +209,8 @@ core::MethodResult RemoteOperations::invokeMethod(const core::CimPath& path, con
     request.call = cimxml::MethodCall{method, object, arguments};
     cimxml::Response response = send(std::move(request), object.toString());
     auto* result = std::get_if<core::MethodResult>(&response.content);
-    return result == nullptr ? core::MethodResult{} : std::move(*result);
+    if (result == nullptr) refuseAnswer("The server's answer is not that of a method.");
+    return std::move(*result);
 }
 
 /// A class comes without its superclasses, so all are fetched to build its chain.

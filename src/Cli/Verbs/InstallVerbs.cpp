@@ -82,7 +82,7 @@ ExitStatus print(Context& context, const Outcome& outcome) {
     std::ostream& stream = outcome.isFailure() ? context.error : context.out;
     stream << (outcome.isFailure() ? "quenxctl: " : "") << printable(outcome.message) << '\n';
     // After a failure the explanation says what the adapter has now.
-    if (outcome.job && !outcome.isFailure()) printChange(stream, outcome);
+    if (outcome.result == "updated") printChange(stream, outcome);
     if (!outcome.advice.empty()) stream << printable(outcome.advice) << '\n';
     return outcome.status;
 }
@@ -102,11 +102,10 @@ bool isInPlace(const Candidate& candidate, const std::vector<Component>& after) 
     });
 }
 
-void judgeJob(const Connection& connection, Outcome& outcome, const Candidate& candidate) {
+/// For an update that completed, as the service says.
+void judgeCompleted(Outcome& outcome, const Candidate& candidate) {
     const std::string& name = outcome.adapter;
-    if (!outcome.job->hasSucceeded()) {
-        outcome.end("failed", explainFailedJob(connection, *outcome.job, candidate, outcome.after));
-    } else if (!isInPlace(candidate, outcome.after)) {
+    if (!isInPlace(candidate, outcome.after)) {
         outcome.end("failed", {"The update of " + name + " ended without an error, but " + name + " has " +
                                    componentsText(outcome.after) + ", not what the image has.",
                                "Check the system log, then install again with --force."});
@@ -151,7 +150,11 @@ void followUpdate(Context& context, const core::CimPath& job, const Candidate& c
     }
     outcome.job->adapter = outcome.adapter;
     outcome.after = readBack(operations, candidate);
-    judgeJob(context.connection, outcome, candidate);
+    if (outcome.job->hasSucceeded()) {
+        judgeCompleted(outcome, candidate);
+    } else {
+        outcome.end("failed", explainFailedJob(context.connection, *outcome.job, candidate, outcome.after));
+    }
 }
 
 /// Nothing where the service was called and did not answer; the outcome then says so.
@@ -187,6 +190,10 @@ ExitStatus installUnlessInterrupted(Context& context, const UpdateOptions& optio
     outcome.returnValue = result->returnValue;
     if (result->returnValue == MethodReturn::JobStarted) {
         followUpdate(context, jobOf(*result), candidate, outcome);
+    } else if (result->returnValue == MethodReturn::Completed) {
+        // Other services may be done by the time they answer, and then name no job.
+        outcome.after = readBack(*context.connection.operations, candidate);
+        judgeCompleted(outcome, candidate);
     } else {
         outcome.end("refused", explainRefusal(context.connection, result->returnValue, candidate));
     }
