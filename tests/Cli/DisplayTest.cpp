@@ -54,6 +54,7 @@ TEST(OutputTest, WritesValuesAsTextAndAsJson) {
     }
     std::ostringstream out;
     cli::printJson(out, {{"name", "no text \xff"}});
+    EXPECT_NE(out.str().find("\\ufffd"), std::string::npos);
     EXPECT_EQ(cli::Json::parse(out.str())["name"], "no text \xEF\xBF\xBD");
 }
 
@@ -62,6 +63,10 @@ TEST(OutputTest, CutsAlignsAndDisarmsText) {
     EXPECT_EQ(cli::elideMiddle("abcdefghij", 8), "abc...ij");
     EXPECT_EQ(cli::elideMiddle("abcdefghij", 2), "..");
     EXPECT_EQ(cli::elideMiddle("äöüäöüäöüä", 8), "äöü...üä");
+    EXPECT_EQ(cli::printable("\x7F\xC2\x9B\x80 \xC2\xA0\xE2\x82\xAC"),
+              "\\x7f\\xc2\\x9b\\x80 \xC2\xA0\xE2\x82\xAC");
+    EXPECT_EQ(cli::printable("\xE2\x80\xA9\xE2\x80\xAE\xE2\x81\xA6\xE2\x81"),
+              "\xE2\x80\xA9\\xe2\\x80\\xae\\xe2\\x81\\xa6\\xe2\\x81");
     std::ostringstream out;
     cli::printTable(out, {{"A", "B"}, {"long\n\x1b", "x"}, {"größe", "y"}, {"", ""}});
     EXPECT_EQ(out.str(), "A             B\nlong\\x0a\\x1b  x\ngröße         y\n              \n");

@@ -28,7 +28,7 @@ std::string displayScalar(core::CimType type, const core::CimScalar& value) {
 }  // namespace
 
 void printJson(std::ostream& out, const Json& document) {
-    out << document.dump(2, ' ', false, Json::error_handler_t::replace) << '\n';
+    out << document.dump(2, ' ', true, Json::error_handler_t::replace) << '\n';
 }
 
 void printTable(std::ostream& out, const std::vector<std::vector<std::string>>& rows) {

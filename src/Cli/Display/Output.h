@@ -14,7 +14,8 @@ namespace cli {
 /// Keeps its members in the order in which they are written here.
 using Json = nlohmann::ordered_json;
 
-/// One document and a line end. Bytes that are not UTF-8 are replaced: JSON has no place for them.
+/// One document and a line end, in ASCII, so that no text drives a terminal. Bytes that are not UTF-8 are
+/// replaced: JSON has no place for them.
 void printJson(std::ostream& out, const Json& document);
 
 /// Prints rows with each column as wide as its widest cell; control characters in cells are made visible.

@@ -7,6 +7,7 @@
 #include <algorithm>
 #include <cstdlib>
 
+#include "CimXml/Xml.h"
 #include "Utils/Utils.h"
 
 namespace cli {
@@ -18,6 +19,16 @@ constexpr const char* kClearLine = "\r\x1B[K";
 bool isSet(const char* variable) {
     const char* value = std::getenv(variable);
     return value != nullptr && *value != '\0';
+}
+
+/// Controls, U+0080 to U+009F among them, move the cursor and more; bidirectional overrides and isolates
+/// (U+202A to U+202E, U+2066 to U+2069) make a text look like another.
+bool drivesTerminal(std::string_view character) {
+    const auto isWithin = [&](std::string_view first, std::string_view last) {
+        return character >= first && character <= last;
+    };
+    return utils::isControl(character.front()) || isWithin("\xC2\x80", "\xC2\x9F") ||
+           isWithin("\xE2\x80\xAA", "\xE2\x80\xAE") || isWithin("\xE2\x81\xA6", "\xE2\x81\xA9");
 }
 
 /// Whether the byte belongs to the character before it.
@@ -39,11 +50,16 @@ std::size_t bytesOfFirst(std::string_view text, std::size_t characters) {
 std::string printable(std::string_view text) {
     std::string result;
     result.reserve(text.size());
-    for (const char c : text) {
-        if (utils::isControl(c))
-            result += "\\x" + utils::hexByte(static_cast<unsigned char>(c));
-        else
-            result += c;
+    while (!text.empty()) {
+        const std::size_t known = cimxml::xmlCharacterLength(text);
+        const std::string_view character = text.substr(0, std::max<std::size_t>(known, 1));
+        if (known == 0 || drivesTerminal(character)) {
+            for (const char byte : character)
+                result += "\\x" + utils::hexByte(static_cast<unsigned char>(byte));
+        } else {
+            result += character;
+        }
+        text.remove_prefix(character.size());
     }
     return result;
 }

@@ -8,8 +8,8 @@
 
 namespace cli {
 
-/// The text with control characters written as \xNN, so that a device's or a file's text cannot drive the
-/// terminal.
+/// The text with the bytes of control characters, of those that change the direction of writing, and of what
+/// is not UTF-8 written as \xNN: a text of a device, a file or a server must not drive the terminal.
 std::string printable(std::string_view text);
 
 /// The columns that a UTF-8 text takes, each character one; bytes that are not UTF-8 count as one each.

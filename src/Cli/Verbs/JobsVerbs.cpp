@@ -61,7 +61,7 @@ void printDeleted(Context& context, const JobView& job) {
         printJson(context.out, {{"deleted", job.id}, {"updateGoesOn", !job.hasEnded()}});
         return;
     }
-    context.out << "Deleted " << job.id << ".\n";
+    context.out << "Deleted " << printable(job.id) << ".\n";
     if (!job.hasEnded()) {
         context.out
             << "Its update continues, but can no longer be followed; until it ends, the server refuses "

@@ -17,7 +17,7 @@ ExitStatus print(Context& context, const std::vector<core::InstanceValue>& insta
         context.out << printable(instance.path.toString()) << '\n';
         for (const core::PropertyValue& property : instance.properties) {
             if (property.value.isNull()) continue;
-            context.out << "    " << property.name << " = " << displayText(property.value) << '\n';
+            context.out << "    " << printable(property.name) << " = " << displayText(property.value) << '\n';
         }
     }
     return ExitStatus::Done;

@@ -138,7 +138,11 @@ ExitStatus showMof(Context& context, const VerbOptions&) {
     if (context.json) {
         printJson(context.out, {{"mof", text}});
     } else {
-        context.out << text;
+        // A server's descriptions are texts like any other; only line ends are the program's own.
+        auto lines = utils::split(text, '\n');
+        for (std::string& line : lines)
+            line = printable(line);
+        context.out << joined(lines, "\n");
     }
     return ExitStatus::Done;
 }
