@@ -99,4 +99,31 @@ TEST(RemoteConnectionTest, TakesNoAnswerForAnotherRequestsOrForNothing) {
     EXPECT_THROW(server.connect().operations->enumerateInstanceNames("Y"), cli::NoAnswer);
 }
 
+/// The error that mof meets with these elements CLASS.
+std::string faultOfClasses(const std::string& classes) {
+    const OneAnswer server(message("1", "<IMETHODRESPONSE NAME='EnumerateClasses'><IRETURNVALUE>" + classes +
+                                            "</IRETURNVALUE></IMETHODRESPONSE>"));
+    try {
+        server.connect().operations->enumerateClasses("", true);
+        return "";
+    } catch (const core::CimError& error) {
+        return error.what();
+    }
+}
+
+std::string classBelow(const std::string& name, const std::string& superclass) {
+    return "<CLASS NAME='" + name + "' SUPERCLASS='" + superclass + "'/>";
+}
+
+TEST(RemoteConnectionTest, BuildsNoEndlessChainsOfClasses) {
+    EXPECT_EQ(faultOfClasses(classBelow("A", "B") + classBelow("B", "Elsewhere")), "");
+    EXPECT_EQ(faultOfClasses(classBelow("A", "a")), "class A is its own superclass");
+    EXPECT_EQ(faultOfClasses(classBelow("A", "B") + classBelow("B", "C") + classBelow("C", "B")),
+              "class B is its own superclass");
+    std::string line;
+    for (int i = 0; i < 20000; ++i)
+        line += classBelow("C" + std::to_string(i), "C" + std::to_string(i + 1));
+    EXPECT_EQ(faultOfClasses(line), "class C0 has too many superclasses");
+}
+
 }  // namespace

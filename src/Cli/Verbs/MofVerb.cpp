@@ -112,7 +112,7 @@ Waiting::const_iterator nextClass(const Waiting& waiting) {
         if (refersToDone(waiting, *each->second)) return each;
         if (best == waiting.end()) best = each;
     }
-    // None fits where a server sends classes that are their own superclasses; the loop must end even then.
+    // If a server sends two classes of one name, none may fit; the loop must end even then.
     return best == waiting.end() ? waiting.begin() : best;
 }
 

@@ -5,6 +5,7 @@
 #include <map>
 #include <set>
 
+#include "Framework/Model/CimError.h"
 #include "Framework/Model/CimInstance.h"
 #include "Framework/Model/CimProperty.h"
 #include "Utils/Os/Linux/Mutex.h"
@@ -162,6 +163,24 @@ std::shared_ptr<const ClassDeclaration> read(const CimClassInfo& info) {
     return declaration;
 }
 
+using DeclarationsByName = std::map<std::string, std::shared_ptr<const ClassDeclaration>>;
+
+/// Throws CimError if a server sends classes whose chains would take all memory.
+void addSuperclasses(ClassChain& chain, const DeclarationsByName& byName) {
+    // Schemas stay below twenty.
+    constexpr std::size_t kMaxLength = 64;
+    for (;;) {
+        const auto superclass = byName.find(foldName(chain.back()->superclass));
+        if (superclass == byName.end()) return;
+        const std::string& name = superclass->second->name;
+        if (derivesFrom(chain, name))
+            throw CimError(CimStatus::Failed, "class " + name + " is its own superclass");
+        if (chain.size() == kMaxLength)
+            throw CimError(CimStatus::Failed, "class " + chain.front()->name + " has too many superclasses");
+        chain.push_back(superclass->second);
+    }
+}
+
 /// Declarations by name, so that nothing points into a library that has unloaded.
 class DeclarationCache {
   public:
@@ -182,7 +201,7 @@ class DeclarationCache {
 
 const std::vector<std::string_view>& qualifierScopes() {
     static const Scopes kScopes{"CLASS",  "ASSOCIATION", "REFERENCE", "PROPERTY",
-                               "METHOD", "PARAMETER",   "INDICATION"};
+                                "METHOD", "PARAMETER",   "INDICATION"};
     return kScopes;
 }
 
@@ -219,19 +238,14 @@ ClassChain declarationsOf(const CimClassInfo& info) {
 }
 
 std::vector<ClassChain> chainsOf(std::vector<ClassDeclaration> declarations) {
-    std::map<std::string, std::shared_ptr<const ClassDeclaration>> byName;
+    DeclarationsByName byName;
     std::vector<ClassChain> chains;
     for (ClassDeclaration& each : declarations) {
         chains.push_back({std::make_shared<const ClassDeclaration>(std::move(each))});
         byName.emplace(foldName(chains.back().front()->name), chains.back().front());
     }
     for (ClassChain& chain : chains) {
-        // No chain is longer than all the classes: a server may send a class that is its own superclass.
-        while (chain.size() <= chains.size()) {
-            const auto superclass = byName.find(foldName(chain.back()->superclass));
-            if (superclass == byName.end()) break;
-            chain.push_back(superclass->second);
-        }
+        addSuperclasses(chain, byName);
     }
     return chains;
 }

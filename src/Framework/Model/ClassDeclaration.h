@@ -98,7 +98,8 @@ using ClassChain = std::vector<std::shared_ptr<const ClassDeclaration>>;
 QUENX_EXPORT ClassChain declarationsOf(const CimClassInfo& info);
 
 /// Builds the chain of each class from declarations of them and their superclasses; one that is not among
-/// them ends a chain.
+/// them ends a chain. Throws CimError that names a class which is its own superclass, or has more
+/// superclasses than any schema.
 QUENX_EXPORT std::vector<ClassChain> chainsOf(std::vector<ClassDeclaration> declarations);
 
 /// Adds the qualifiers that the other members imply: Association, Key, In and Out.
