@@ -28,7 +28,8 @@ int main(int argc, char** argv) {
     std::uint64_t jobs = 10'000;
     for (int i = 1; i < argc; ++i) {
         if (take(argv[i], "--seconds=", seconds) || take(argv[i], "--jobs=", jobs)) continue;
-        std::fprintf(stderr, "usage: %s [--seconds=N] [--jobs=N]\n", argv[0]);
+        std::fprintf(stderr, "soak: \"%s\" is not one of --seconds=N and --jobs=N, with a number.\n",
+                     argv[i]);
         return 2;
     }
     test::effort = {true, std::chrono::seconds(seconds), jobs};

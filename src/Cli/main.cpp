@@ -4,8 +4,10 @@
 
 #include <array>
 #include <atomic>
+#include <cerrno>
 #include <chrono>
 #include <csignal>
+#include <cstring>
 #include <iostream>
 #include <string_view>
 #include <thread>
@@ -133,8 +135,10 @@ int main(int argc, char** argv) {
     // A result that nobody can read is a failure; an update, though, has happened whether or not anybody
     // reads about it.
     const bool mayHaveUpdated = arguments && arguments->startsUpdate();
+    errno = 0;
     if (!std::cout.flush()) {
-        std::cerr << "quenxctl: Cannot write the output.\n";
+        const std::string reason = errno == 0 ? "" : std::string(": ") + std::strerror(errno);
+        std::cerr << "quenxctl: Cannot write the output" << reason << ".\n";
         if (!mayHaveUpdated && status == cli::ExitStatus::Done) status = cli::ExitStatus::Failed;
     }
     return static_cast<int>(status);

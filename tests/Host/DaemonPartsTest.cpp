@@ -28,6 +28,7 @@ TEST(SettingsTest, NameTheMistakesInTheFile) {
         {"[listen]\naddress = 1\n", "must be a text"},
         {"[auth]\nreaders = 'a'\n", "must be a list"},
         {"[auth]\nreaders = [1]\n", "must be a text"},
+        {"\n[lisen]\n", ":2: there is no section [lisen]"},
         {"[listen]\nunknown = 1\n", ":2: there is no setting listen.unknown"},
         {"[unknown]\nx = 1\n", "unknown.x"},
         {"https = true\n", "must be in a [section]"},

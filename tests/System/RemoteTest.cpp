@@ -136,6 +136,7 @@ TEST_F(RemoteTest, ShowsTheSameModelAsInProcess) {
         EXPECT_NE(expected, "") << line;
         EXPECT_EQ(linesOf(quenxctl(line).out), linesOf(expected)) << line;
     }
+    expectError("associators " + port + " --class No_Such", 4, "No class \"No_Such\" is served.");
     expectError("instances No_<&>\"Such", 4, "No_<&>\"Such");
 }
 

@@ -66,7 +66,8 @@ TEST_F(WrongUseTest, RefusesWrongImagesNamingBothSides) {
     const auto pxe = test::madeRom({{FirmwareType::PXE, 2}}, 0x15ad, 0x07b0);
     const std::string differing = "check --target eth4 " + m_folder.write("pxe.rom", pxe);
     const std::string types =
-        "The image types differ: the image has IMG_PXE, which eth4 does not: it has IMG_iSCSI 1, IMG_UEFI 0.\n";
+        "The image types differ: the image has IMG_PXE, which eth4 does not: it has IMG_iSCSI 1, IMG_UEFI "
+        "0.\n";
     expectError(differing, 1, types + "Use an image with the same types, or --force, which works unless");
     EXPECT_EQ(quenxctl(differing + " --force").status, 0);
     expectError(differing + " --force --config " + m_folder.write("provider.conf", "OEMCustomizeable=5\n"), 1,
@@ -116,6 +117,7 @@ TEST_F(WrongUseTest, SaysWhatIsWrongWithACommandLineAndWhatToDo) {
         {"jobs", 2, "Jobs are kept by a server, and none was named"},
         {"adapters --server 127.0.0.1:5989", 2, "Write it as https://host:5989."},
         {"adapters --server https://a:b@host", 2, "Name the user with --user"},
+        {"adapters --config /", 2, "The configuration file / is a directory.\nName a file."},
         {"associators nonsense", 2, "is not the path of an instance."},
         {"adapters --config " + none, 2, ": No such file or directory.\nCheck the path.\n"},
         {"adapters --providers " + none, 2, "Cannot read the provider directory"},

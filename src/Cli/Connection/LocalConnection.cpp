@@ -16,6 +16,10 @@ namespace cli {
 namespace {
 
 void requireReadable(const std::string& file, const std::string& what) {
+    std::error_code error;  // access() says it better
+    if (std::filesystem::is_directory(file, error))
+        throw CommandError(ExitStatus::WrongUse, "The " + what + " " + file + " is a directory.",
+                           "Name a file.");
     if (access(file.c_str(), R_OK) == 0) return;
     const Explanation why = cannotRead("the " + what + " " + file, errno);
     throw CommandError(ExitStatus::WrongUse, why.message, why.advice);

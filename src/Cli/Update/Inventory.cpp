@@ -16,7 +16,9 @@ namespace {
 
 constexpr const char* kAskInventory =
     "\"quenxctl identities\" lists the images. To add a file, put its directory into the line "
-    "\"FWFilePath=\" of the service's configuration file, or install it by its path.";
+    "\"FWFilePath=\" of the service's configuration file (by default /etc/quenx-cimprovider.conf), or "
+    "install "
+    "it by its path.";
 
 /// The same text, or two names of one file.
 bool isSameFile(const std::string& uri, const std::string& other) {

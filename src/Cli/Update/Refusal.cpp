@@ -263,9 +263,9 @@ Explanation explainFailedJob(const Connection& connection, const JobView& job, c
 
 std::string adviceAfterCheck(const Connection& connection, const std::string& adapter) {
     if (connection.isInProcess) return {};
-    return "The server may now hold " + adapter +
-           " and refuse further checks and installs until it is restarted. To prevent that, put "
-           "\"ReleaseClaimAfterCheck=1\" into the configuration file of its providers.";
+    return "Unless the configuration of its providers has \"ReleaseClaimAfterCheck=1\", the server now "
+           "holds " +
+           adapter + " and refuses further checks and installs until it is restarted.";
 }
 
 }  // namespace cli

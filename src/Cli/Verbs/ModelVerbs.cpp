@@ -43,6 +43,15 @@ std::vector<std::string> servedClasses(core::CimOperations& operations) try {
     return {};
 }
 
+[[noreturn]] void refuseClass(core::CimOperations& operations, const std::string& name) {
+    throw CommandError(ExitStatus::NotFound, "No class \"" + name + "\" is served.",
+                       didYouMean(name, servedClasses(operations)) + kAskMof);
+}
+
+void refuseUnknownClass(core::CimOperations& operations, const std::string& name) {
+    if (!name.empty() && operations.getClass(name).empty()) refuseClass(operations, name);
+}
+
 }  // namespace
 
 ExitStatus showInstances(Context& context, const VerbOptions& options) try {
@@ -52,9 +61,7 @@ ExitStatus showInstances(Context& context, const VerbOptions& options) try {
 } catch (const core::CimError& error) {
     // Looked up only now: a class that is served needs no list of the others.
     if (error.status() != core::CimStatus::InvalidClass) throw;
-    throw CommandError(
-        ExitStatus::NotFound, "No class \"" + options.className + "\" is served.",
-        didYouMean(options.className, servedClasses(*context.connection.operations)) + kAskMof);
+    refuseClass(*context.connection.operations, options.className);
 }
 
 ExitStatus showAssociators(Context& context, const VerbOptions& options) {
@@ -64,8 +71,17 @@ ExitStatus showAssociators(Context& context, const VerbOptions& options) {
         throw CommandError(ExitStatus::WrongUse, "\"" + options.path + "\" is not the path of an instance.",
                            "Give one as \"quenxctl instances CLASS --names\" prints it, in single quotes.");
     }
-    return options.namesOnly ? print(context, operations.associatorNames(path, options.filter))
-                             : print(context, operations.associators(path, options.filter));
+    try {
+        return options.namesOnly ? print(context, operations.associatorNames(path, options.filter))
+                                 : print(context, operations.associators(path, options.filter));
+    } catch (const core::CimError& error) {
+        // To the operation an unknown class of the filter is a wrong parameter like any other.
+        if (error.status() == core::CimStatus::InvalidParameter) {
+            refuseUnknownClass(operations, options.filter.associationClass);
+            refuseUnknownClass(operations, options.filter.resultClass);
+        }
+        throw;
+    }
 }
 
 }  // namespace cli

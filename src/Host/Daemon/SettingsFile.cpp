@@ -93,6 +93,11 @@ void readSettingsFile(const std::string& file, Settings& settings) {
             throw std::runtime_error(place + ": " + std::string(section.str()) +
                                      " must be in a [section], such as [listen]");
         }
+        const std::string prefix = std::string(section.str()) + ".";
+        const auto isIn = [&](const SettingsField& field) { return field.key.starts_with(prefix); };
+        // A misspelt section without keys would leave no key to be noticed by.
+        if (entries->empty() && std::none_of(fields.begin(), fields.end(), isIn))
+            throw std::runtime_error(place + ": there is no section [" + std::string(section.str()) + "]");
         for (const auto& [name, value] : *entries) {
             const std::string key = std::string(section.str()) + "." + std::string(name.str());
             setField(fields, key, value, placeOf(file, value.source()));
