@@ -184,7 +184,8 @@ TEST(ConfigCheckTest, LooksAtEveryFile) {
         {2, key, key, {}},
     };
     for (const auto& row : table) {
-        Words arguments{"--config", folder.write("config", ""), "--listen-https-port", "0"};
+        const std::string config = "[daemon]\nlock_file = '" + (folder / "lock") + "'\n";
+        Words arguments{"--config", folder.write("config", config), "--listen-https-port", "0"};
         arguments.insert(arguments.end(), {"--tls-certificate", row.certificate, "--tls-key", row.key});
         arguments.insert(arguments.end(), row.more.begin(), row.more.end());
         EXPECT_EQ(host::checkConfiguration(read(arguments).settings), row.status) << &row - table;

@@ -293,7 +293,10 @@ TEST(DaemonTest, RunsWhereItIsInstalled) {
     const ProgramResult installed = installBelow(place, "/new/prefix");
     ASSERT_EQ(installed.status, 0) << installed.error;
     const std::string prefix = place / "staged/new/prefix";
-    const std::string config = place.write("config", "[listen]\nhttps = false\nhttp = true\nhttp_port = 0\n");
+    const std::string config = place.write("config",
+                                           "[listen]\nhttps = false\nhttp = true\nhttp_port = 0\n"
+                                           "[daemon]\nlock_file = '" +
+                                               (place / "lock") + "'\n");
     const ProgramResult checked =
         test::run({prefix + "/sbin/quenx-cimd", "--check-config", "--config", config});
     EXPECT_EQ(checked.status, 0) << checked.error;
