@@ -130,6 +130,12 @@ std::vector<Component> readBack(core::CimOperations& operations, const Candidate
     }
 }
 
+/// The update is under way, or may be, and this program no longer sees it: nor what the adapter has now.
+void endAsUnknown(Outcome& outcome, const Explanation& why) {
+    outcome.after.clear();
+    outcome.end("unknown", why);
+}
+
 void followUpdate(Context& context, const core::CimPath& job, const Candidate& candidate, Outcome& outcome) {
     core::CimOperations& operations = *context.connection.operations;
     context.progress.started(outcome.adapter, candidate.comparison ? candidate.comparison->bytes : 0);
@@ -138,14 +144,12 @@ void followUpdate(Context& context, const core::CimPath& job, const Candidate& c
         followJob(operations, *outcome.job, context.progress, context.following);
     } catch (const CommandError& error) {
         context.progress.ended();
-        outcome.after.clear();
-        if (error.status() == ExitStatus::Interrupted) {
-            outcome.end("unknown",
-                        {"Interrupted. The update of " + outcome.adapter + " goes on on the server.",
-                         "\"quenxctl jobs\" shows how far it is.", ExitStatus::Interrupted});
-        } else {
-            outcome.end("unknown", {error.what(), error.advice(), ExitStatus::Unknown});
-        }
+        const bool isInterrupted = error.status() == ExitStatus::Interrupted;
+        endAsUnknown(outcome, isInterrupted ? Explanation{"Interrupted. The update of " + outcome.adapter +
+                                                              " goes on on the server.",
+                                                          "\"quenxctl jobs\" shows how far it is.",
+                                                          ExitStatus::Interrupted}
+                                            : Explanation{error.what(), error.advice(), ExitStatus::Unknown});
         return;
     }
     outcome.job->adapter = outcome.adapter;
@@ -162,9 +166,8 @@ std::optional<core::MethodResult> start(Context& context, const Candidate& candi
     try {
         return startUpdate(*context.connection.operations, candidate);
     } catch (const NoAnswer& error) {
-        outcome.after.clear();
-        outcome.end(
-            "unknown",
+        endAsUnknown(
+            outcome,
             {error.what() + (" The update of " + outcome.adapter) + " may have begun.",
              "\"quenxctl jobs\" shows whether it runs, \"quenxctl adapters\" which firmware is there. "
              "Look before you install again.",
