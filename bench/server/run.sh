@@ -102,7 +102,6 @@ post() { # FILE CIMMETHOD CIMOBJECT
     curl -sS "$http" -H 'Content-Type: application/xml; charset="utf-8"' -H 'CIMOperation: MethodCall' \
         -H "CIMMethod: $2" -H "CIMObject: $3" -H "Authorization: Basic $CREDENTIALS" --data-binary "@$1"
 }
-service_object='root/cimv2:Quenx_SoftwareInstallationService.Name="Quenx:FirmwareUpdate"'
 # The first path of a class, as an element.
 path_of() {
     enumerate EnumerateInstanceNames "$1" >"$scratch/names.xml"
@@ -111,6 +110,9 @@ path_of() {
 }
 service="$(path_of Quenx_SoftwareInstallationService)"
 target="$(path_of Quenx_EthernetPort)"
+# The same path as the text of a CIMObject header.
+service_object="root/cimv2:Quenx_SoftwareInstallationService.$(grep -oP 'KEYBINDING NAME="\K[^"]+|<KEYVALUE[^>]*>\K[^<]+' \
+    <<<"$service" | paste -d= - - | sed 's/=\(.*\)/="\1"/' | paste -sd,)"
 enumerate EnumerateInstances Quenx_SoftwareInstallationService >"$scratch/service.xml"
 enumerate EnumerateInstances Quenx_ConcreteJob >"$scratch/jobs.xml"
 install "https://elsewhere/image" >"$scratch/refused.xml"
@@ -134,10 +136,11 @@ echo "resident after about $requests requests: $(resident)"
 for ((done = 0; done < jobs;)); do
     # The adapter of a job that has not ended refuses the next (return value 6).
     answer="$(post "$scratch/install.xml" InstallFromURI "$service_object")"
-    case "$answer" in *"<ERROR "*) echo "$answer" >&2; exit 1 ;; esac
-    if [[ "$answer" == *"<VALUE>4096<"* ]]; then
-        done=$((done + 1))
-    fi
+    case "$answer" in
+        *"<VALUE>4096<"*) done=$((done + 1)) ;;
+        *"<VALUE>6<"*) ;;
+        *) echo "$0: InstallFromURI was answered with: $answer" >&2; exit 1 ;;
+    esac
 done
 echo "resident with $jobs jobs: $(resident)"
 job="$(path_of Quenx_ConcreteJob)"
