@@ -36,6 +36,9 @@ class QUENX_EXPORT PortController {
     virtual utils::PCIAddr getPCIAddress() const = 0;
     /// True when the address is that of one of the card's functions.
     virtual bool holds(const utils::PCIAddr& address) const = 0;
+    /// True when holds() is true for functions of getPCIAddress() alone. Who looks for the controller of a
+    /// port need not ask then about ports elsewhere. A controller that cannot promise it is asked about all.
+    virtual bool holdsOneDevice() const { return false; }
 };
 
 /// A piece of firmware: in a file that can be installed, or on an adapter.

@@ -35,6 +35,7 @@ class Quenx_PortController : public CIM_PortController, public inventory::PortCo
 
     utils::PCIAddr getPCIAddress() const override;
     bool holds(const utils::PCIAddr& address) const override;
+    bool holdsOneDevice() const override { return true; }
 
   private:
     const inventory::Card m_card;

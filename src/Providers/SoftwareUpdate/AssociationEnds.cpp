@@ -1,6 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Providers/SoftwareUpdate/AssociationEnds.h"
 
+#include <algorithm>
+#include <map>
+#include <utility>
+
 #include "Utils/Exception.h"
 
 const CIM_SoftwareInstallationService* onlyOne(Services& services) {
@@ -9,18 +13,35 @@ const CIM_SoftwareInstallationService* onlyOne(Services& services) {
     return services.first();
 }
 
+namespace {
+
+using Device = std::pair<std::uint8_t, std::uint8_t>;
+
+Device deviceOf(const utils::PCIAddr& address) {
+    return {address.bus, address.device};
+}
+
+}  // namespace
+
 AdapterIndex::AdapterIndex() {
+    std::map<Device, std::vector<std::size_t>> portsByDevice;
     for (const inventory::EthernetPort* port : m_portInstances) {
         m_ports.push_back(
             {dynamic_cast<const CIM_ManagedElement*>(port), port->getAdapterName(), port->getPCIAddress()});
         m_portsByName.emplace(m_ports.back().adapterName, m_ports.size() - 1);
+        portsByDevice[deviceOf(m_ports.back().address)].push_back(m_ports.size() - 1);
     }
-    // The controllers are the outer loop, so that one is in the cache while the ports pass by: a thousand
-    // ports on their cards are a quarter of a million questions.
     for (const inventory::PortController* controller : m_controllerInstances) {
-        for (IndexedPort& port : m_ports) {
+        const auto ask = [&](IndexedPort& port) {
             if (controller->holds(port.address))
                 port.controllers.push_back(dynamic_cast<const CIM_ManagedElement*>(controller));
+        };
+        // Ten thousand ports would otherwise be twenty-five million questions.
+        if (controller->holdsOneDevice()) {
+            for (const std::size_t port : portsByDevice[deviceOf(controller->getPCIAddress())])
+                ask(m_ports[port]);
+        } else {
+            std::ranges::for_each(m_ports, ask);
         }
     }
 }

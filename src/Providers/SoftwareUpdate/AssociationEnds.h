@@ -30,7 +30,8 @@ struct IndexedPort {
 /// A snapshot of the ports and controllers. Holds the instances while it lives.
 class AdapterIndex {
   public:
-    /// Asks every controller about every port: only the controller knows which addresses it holds.
+    /// Asks each controller about the ports that it may hold: only the controller knows which addresses it
+    /// holds.
     AdapterIndex();
 
     const std::vector<IndexedPort>& ports() const { return m_ports; }
