@@ -1,25 +1,21 @@
 // SPDX-License-Identifier: Apache-2.0
 // Loaded by a host of C, to start and call what the providers serve without the host's knowing of C++.
-#include <memory>
 #include <string>
 
+#include "Framework/Classes/CimBroker.h"
 #include "Framework/Requests/CimRequests.h"
 #include "Utils/Os/Linux/LinuxOSLocker.h"
 
 namespace {
 
-struct Session {
-    os::OSLockerLinux locker;
-    core::CimRequests requests{"root/cimv2"};
-};
-
-std::unique_ptr<Session> session;
+// For as long as this library is loaded.
+const os::OSLockerLinux locker;
+core::CimRequests requests{"root/cimv2"};
 
 /// Starts an update of the first port; 5 stands for "update".
 std::uint32_t install(const std::string& uri) {
     using core::CimType;
     using core::CimValue;
-    core::CimRequests& requests = session->requests;
     const core::CimPath service = requests.enumerateInstanceNames("Quenx_SoftwareInstallationService").at(0);
     const core::CimPath port = requests.enumerateInstanceNames("Quenx_EthernetPort").at(0);
     return requests
@@ -35,12 +31,8 @@ std::uint32_t install(const std::string& uri) {
 
 extern "C" {
 
-QUENX_EXPORT void beginSession() {
-    session = std::make_unique<Session>();
-}
-
-QUENX_EXPORT void endSession() {
-    session.reset();
+QUENX_EXPORT int agentCount() {
+    return static_cast<int>(core::GetCimBroker()->useAgents().size());
 }
 
 /// 1 when a job has been made for the image at this URI.

@@ -1,9 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
 // A host without the C++ library, which therefore comes and goes with the providers: nothing that a thread of
-// theirs does for the first time has been done for it before. It has never logged a line either.
+// theirs does for the first time has been done for it before. It has never logged a line either. It loads two
+// providers, unloads the one with the index CLOSED first, and prints what is left after each step.
 //
-//   HostOfC INVENTORY UPDATE STARTER flash URI   unloads while the flash runs
-//   HostOfC INVENTORY UPDATE STARTER calls URI   unloads while many threads call, wrongly
+//   HostOfC ONE OTHER STARTER CLOSED flash URI   unloads while the flash runs
+//   HostOfC ONE OTHER STARTER CLOSED calls URI   unloads while many threads call, wrongly
 #include <dlfcn.h>
 #include <pthread.h>
 #include <stdio.h>
@@ -25,6 +26,12 @@ void* load(const char* path) {
     exit(1);
 }
 
+int isMapped(const char* library) {
+    void* const handle = dlopen(library, RTLD_NOW | RTLD_NOLOAD);
+    if (handle != nullptr) dlclose(handle);
+    return handle == nullptr ? 0 : 1;
+}
+
 void* callWrongly(void*) {
     while (__atomic_load_n(&stopCalling, __ATOMIC_ACQUIRE) == 0)
         startFlash("nonsense");
@@ -34,26 +41,33 @@ void* callWrongly(void*) {
 }  // namespace
 
 int main(int argc, char** argv) {
-    if (argc != 6) return 2;
+    if (argc != 7) return 2;
     alarm(kHangsAfterSeconds);
-    void* const inventory = load(argv[1]);
-    void* const update = load(argv[2]);
+    void* const providers[] = {load(argv[1]), load(argv[2])};
     void* const starter = load(argv[3]);
-    reinterpret_cast<void (*)()>(dlsym(starter, "beginSession"))();
     startFlash = reinterpret_cast<int (*)(const char*)>(dlsym(starter, "startFlash"));
+    const auto agentCount = reinterpret_cast<int (*)()>(dlsym(starter, "agentCount"));
+    const auto report = [&] {
+        printf("%d agents, mapped: %d %d\n", agentCount(), isMapped(argv[1]), isMapped(argv[2]));
+    };
+    report();
 
-    const bool calls = strcmp(argv[4], "calls") == 0;
+    const bool calls = strcmp(argv[5], "calls") == 0;
     pthread_t threads[kThreads];
     for (int i = 0; calls && i < kThreads; ++i)
         pthread_create(&threads[i], nullptr, callWrongly, nullptr);
-    if (!calls && startFlash(argv[5]) != 1) return 3;
-    dlclose(update);
-    dlclose(inventory);
+    if (!calls && startFlash(argv[6]) != 1) return 3;
+    const int closedFirst = atoi(argv[4]);
+    dlclose(providers[closedFirst]);
+    report();
+    dlclose(providers[1 - closedFirst]);
+    report();
     __atomic_store_n(&stopCalling, 1, __ATOMIC_RELEASE);
     for (int i = 0; calls && i < kThreads; ++i)
         pthread_join(threads[i], nullptr);
 
-    reinterpret_cast<void (*)()>(dlsym(starter, "endSession"))();
-    puts("unloaded");
+    // The rest goes with its last user.
+    dlclose(starter);
+    printf("any: %d\n", isMapped("libQuenx_CimFramework.so") + isMapped("libQuenx_Utils.so"));
     return 0;
 }

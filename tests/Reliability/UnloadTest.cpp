@@ -2,7 +2,6 @@
 // The provider's library goes while its jobs are running or finished, and comes back.
 #include <gtest/gtest.h>
 
-#include <filesystem>
 #include <thread>
 
 #include "Providers/SoftwareUpdate/HookedBackend.h"
@@ -127,69 +126,51 @@ std::string outputOf(const std::vector<std::string>& words) {
     return text;
 }
 
-/// What the plain host prints when it loads the libraries in this order and closes the one with that index
-/// first.
-std::string plainHost(const char* loadedFirst, const char* loadedSecond, int closedFirst) {
-    return outputOf(
-        {QUENX_PLAIN_HOST, loadedFirst, loadedSecond, QUENX_AGENT_COUNT, std::to_string(closedFirst)});
-}
-
-TEST(PlainHostTest, LeavesNothingMappedWhicheverProviderItClosesFirst) {
-    if (!ProviderLibrary::isUnloadable()) GTEST_SKIP() << "sanitizer builds keep the library";
-    const std::string begin = "2 agents, mapped: 1 1\n";
-    const std::string end = "0 agents, mapped: 0 0\nany: 0\n";
-    for (const auto& [one, other] : {std::pair(QUENX_INVENTORY_LIBRARY, QUENX_UPDATE_LIBRARY),
-                                     std::pair(QUENX_UPDATE_LIBRARY, QUENX_INVENTORY_LIBRARY)}) {
-        EXPECT_EQ(plainHost(one, other, 0), begin + "1 agents, mapped: 0 1\n" + end) << one;
-        EXPECT_EQ(plainHost(one, other, 1), begin + "1 agents, mapped: 1 0\n" + end) << one;
-    }
-}
-
 // dlclose holds the loader's lock while it waits for workers and requests. Whatever these do for the first
 // time in the process or on their thread must not need that lock: a backtrace, a thread-local variable, an
 // exception.
-TEST(HostOfCTest, UnloadsWhileFlashesFailAndRequestsAreRefused) {
+TEST(HostOfCTest, UnloadsEitherProviderFirstWhileFlashesFailAndRequestsAreRefused) {
     if (!ProviderLibrary::isUnloadable()) GTEST_SKIP() << "sanitizer builds keep the library";
     const test::TempFolder folder;
     const auto rom = test::madeRom({{FirmwareType::PXE, 2}, {FirmwareType::UEFI, 1}});
     const std::string uri = "file://" + folder.write("image.rom", std::span(rom));
-    for (const std::string action : {"fail", "throw"}) {
-        folder.write("adapters.toml", R"(
-            [[adapter]]
-            name = "eth0"
-            pci_address = "0000:03:00.0"
-            pci_id = "1af4:1041"
-            mac = "52:54:00:00:00:10"
-            components = [ { type = "IMG_PXE", revision = 1 }, { type = "IMG_UEFI", revision = 0 } ]
-            [[adapter.fault]]
-            at = "write"
-            action = "stall"
-            milliseconds = 200
-            [[adapter.fault]]
-            at = "write"
-            percent = 50
-            text = "the device went away"
-            action = ")" + action + "\"\n");
-        for (const std::string use : {"flash", "calls"}) {
-            EXPECT_EQ(
-                outputOf({"env", "QUENX_ADAPTERS=" + folder / "adapters.toml",
-                          "QUENX_ADAPTER_STATE=" + folder / "state", QUENX_HOST_OF_C, QUENX_INVENTORY_LIBRARY,
-                          QUENX_UPDATE_LIBRARY, QUENX_FLASH_STARTER, use, uri}),
-                "unloaded\n")
-                << use << ' ' << action;
+    for (const auto& [one, other] : {std::pair(QUENX_INVENTORY_LIBRARY, QUENX_UPDATE_LIBRARY),
+                                     std::pair(QUENX_UPDATE_LIBRARY, QUENX_INVENTORY_LIBRARY)}) {
+        for (const std::string closedFirst : {"0", "1"}) {
+            const bool isOne = closedFirst == "0";
+            folder.write("adapters.toml", R"(
+                [[adapter]]
+                name = "eth0"
+                pci_address = "0000:03:00.0"
+                pci_id = "1af4:1041"
+                mac = "52:54:00:00:00:10"
+                components = [ { type = "IMG_PXE", revision = 1 }, { type = "IMG_UEFI", revision = 0 } ]
+                [[adapter.fault]]
+                at = "write"
+                action = "stall"
+                milliseconds = 200
+                [[adapter.fault]]
+                at = "write"
+                percent = 50
+                text = "the device went away"
+                action = ")" + std::string(isOne ? "fail" : "throw") +
+                                              "\"\n");
+            for (const std::string use : {"flash", "calls"}) {
+                EXPECT_EQ(outputOf({"env", "QUENX_ADAPTERS=" + folder / "adapters.toml",
+                                    "QUENX_ADAPTER_STATE=" + folder / "state", QUENX_HOST_OF_C, one, other,
+                                    QUENX_FLASH_STARTER, closedFirst, use, uri}),
+                          "2 agents, mapped: 1 1\n1 agents, mapped: " + std::string(isOne ? "0 1" : "1 0") +
+                              "\n0 agents, mapped: 0 0\nany: 0\n")
+                    << use << ", closed first: " << (isOne ? one : other);
+            }
         }
     }
 }
 
+/// A worker that binds a symbol late waits for the loader's lock, too.
 TEST(LibrariesTest, BindAllSymbolsWhenTheyAreLoaded) {
-    int libraries = 0;
-    for (const auto& entry :
-         std::filesystem::directory_iterator(std::filesystem::path(QUENX_UPDATE_LIBRARY).parent_path())) {
-        if (!entry.path().filename().string().starts_with("libQuenx_")) continue;
-        ++libraries;
-        EXPECT_NE(outputOf({"readelf", "-d", entry.path()}).find("BIND_NOW"), std::string::npos) << entry;
-    }
-    EXPECT_GE(libraries, 6);
+    for (const char* library : {QUENX_INVENTORY_LIBRARY, QUENX_UPDATE_LIBRARY})
+        EXPECT_NE(outputOf({"readelf", "-d", library}).find("BIND_NOW"), std::string::npos) << library;
 }
 
 }  // namespace
