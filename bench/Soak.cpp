@@ -4,6 +4,7 @@
 #include <gtest/gtest.h>
 
 #include <charconv>
+#include <cinttypes>
 #include <cstdio>
 #include <string_view>
 
@@ -36,7 +37,8 @@ int main(int argc, char** argv) {
     ::testing::AddGlobalTestEnvironment(new test::ChosenEnvironment);
     const int status = RUN_ALL_TESTS();
     std::printf("\n| figure | number |\n|---|---|\n");
-    test::printFigures();
+    for (const auto& [name, number] : test::figures)
+        std::printf("| %s | %" PRIu64 " |\n", name.c_str(), number);
     std::printf("| tests that found a loss | %d |\n",
                 ::testing::UnitTest::GetInstance()->failed_test_count());
     return status;

@@ -14,6 +14,7 @@ using On = test::AllocationFailure::On;
 using test::CallResult;
 
 constexpr unsigned kJobStarted = 4096;
+constexpr unsigned kInsufficientMemory = 4100;
 
 class AllocationTest : public test::UpdateTest {
   protected:
@@ -21,6 +22,7 @@ class AllocationTest : public test::UpdateTest {
     bool failAt(On on, std::uint64_t n, bool releases);
     void failEverywhere(On on, std::uint64_t step, bool releases);
 
+    bool m_isTold = false;  ///< by a return value, that memory ran out
     const std::string m_image = goodImage();
     const std::string m_old = test::describeRom(m_adapters->flashContent("eth0"));
     const core::CimPath m_service = service();
@@ -57,6 +59,7 @@ bool AllocationTest::failAt(On on, std::uint64_t n, bool releases) {
     const std::string flash = test::describeRom(m_adapters->flashContent("eth0"));
     EXPECT_TRUE(flash == "IMG_PXE 2, IMG_UEFI 1" || flash == m_old) << flash;
     EXPECT_TRUE(struck || result.returnValue == kJobStarted) << result.error;
+    m_isTold = m_isTold || result.returnValue == kInsufficientMemory;
     return struck;
 }
 
@@ -82,6 +85,7 @@ TEST_F(AllocationTest, FailingInTheRequestAndInTheWorker) {
         m_folder.write("quenx.conf", releases ? "ReleaseClaimAfterCheck=1\n" : "\n");
         failEverywhere(On::ThisThread, 1, releases);
     }
+    EXPECT_TRUE(m_isTold);
     failEverywhere(On::OtherThreads, 1, true);
 }
 

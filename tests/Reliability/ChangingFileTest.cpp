@@ -40,21 +40,17 @@ class ChangingFileTest : public test::UpdateTest {
 void ChangingFileTest::arrange(When when, const std::function<void()>& change) {
     m_changed = false;
     m_sizes = 0;
-    const auto once = [this, change] {
+    const auto changeOnce = [this, change] {
         if (!std::exchange(m_changed, true)) change();
     };
     m_backend->hook = [=](const std::string& called, const std::string&) {
-        const bool isPreparation = when == When::BeforePreparation && called == "prepareFlashImage";
-        const bool isWrite = when == When::BeforeWrite && called == "writeFlashImage";
-        if (isPreparation || isWrite) once();
+        const char* const step = when == When::BeforeWrite ? "writeFlashImage" : "prepareFlashImage";
+        if (when >= When::BeforePreparation && called == step) changeOnce();
     };
     // The size is asked for twice: to see whether there is a file, and to make room for it. Each says so.
     test::SyslogCapture::observe([=, this](const std::string& line) {
         if (line.find("Output size of file") == std::string::npos) return;
-        ++m_sizes;
-        const bool isFirst = when == When::BeforeSize && m_sizes == 1;
-        const bool isSecond = when == When::BeforeRead && m_sizes == 2;
-        if (isFirst || isSecond) once();
+        if (++m_sizes == (when == When::BeforeSize ? 1 : 2) && when <= When::BeforeRead) changeOnce();
     });
 }
 
@@ -97,6 +93,7 @@ TEST_F(ChangingFileTest, WhatWasReadAndVerifiedIsWrittenWholeOrNothingIs) {
             fs::remove_all(m_adapters.stateDirectory());
             const std::string uri = file("image.rom", rom(2));
             arrange(when, row.make);
+            test::SyslogCapture::clear();
             const CallResult result = installAndEnd(uri);
             EXPECT_TRUE(m_changed);
             const std::string outcome = std::to_string(result.returnValue) + (claim().empty() ? "/" : "K/") +
@@ -104,6 +101,7 @@ TEST_F(ChangingFileTest, WhatWasReadAndVerifiedIsWrittenWholeOrNothingIs) {
             EXPECT_EQ(outcome, when == When::BeforeSize   ? row.beforeSize
                                : when == When::BeforeRead ? row.beforeRead
                                                           : kOld);
+            EXPECT_EQ(test::SyslogCapture::contains("Job cannot read the URI for '"), outcome == "2/1");
             setClaim("");
             test::count("files changed on the way");
         }

@@ -2,9 +2,7 @@
 #pragma once
 
 #include <chrono>
-#include <cinttypes>
 #include <cstdint>
-#include <cstdio>
 #include <map>
 #include <mutex>
 #include <string>
@@ -28,12 +26,6 @@ inline std::map<std::string, std::uint64_t> figures;
 inline void count(const std::string& figure, std::uint64_t number = 1) {
     const std::lock_guard lock(figuresMutex);
     figures[figure] += number;
-}
-
-/// One line a figure, in the order of their names.
-inline void printFigures() {
-    for (const auto& [name, number] : figures)
-        std::printf("| %s | %" PRIu64 " |\n", name.c_str(), number);
 }
 
 }  // namespace test

@@ -3,6 +3,7 @@
 #include <thread>
 
 #include "Framework/Classes/InstanceLifetime.h"
+#include "Providers/SoftwareUpdate/MethodResults.h"
 #include "Providers/SoftwareUpdate/UpdateTest.h"
 #include "Reliability/Effort.h"
 #include "Reliability/Interposed.h"
@@ -19,7 +20,7 @@ constexpr unsigned kJobStarted = 4096;
 
 /// Whose call is struck.
 enum class On { Request, Worker };
-enum class How { Throw, Stall };
+enum class How { Throw, Refuse, Stall };
 
 class FaultTableTest : public test::UpdateTest {
   protected:
@@ -39,8 +40,11 @@ class FaultTableTest : public test::UpdateTest {
     /// Throws at, or holds up, one operation of the adapter API.
     std::function<void()> strike(const std::string& operation, On on, How how);
     /// Has the adapter itself fail.
-    std::function<void()> order(ma::Operation at, Fault::Action action, uint16_t percent = 0) {
-        return [=, this] { m_adapters->injectFault("eth4", Fault{at, action, percent, 17, "on order", 30}); };
+    std::function<void()> order(ma::Operation at, Fault::Action action, uint16_t percent = 0,
+                                uint32_t code = 17) {
+        return [=, this] {
+            m_adapters->injectFault("eth4", Fault{at, action, percent, code, "on order", 30});
+        };
     }
     void run(const Row& row, bool releases);
     void disarm();
@@ -68,6 +72,7 @@ std::function<void()> FaultTableTest::strike(const std::string& operation, On on
             if (called != operation || isRequest != (on == On::Request)) return;
             ++m_struck;
             if (how == How::Stall) return utils::Thread::msleep(30);
+            if (how == How::Refuse) throw utils::EInvalidParameter("odd");
             if (on == On::Worker) throw 42;
             throw std::runtime_error(operation);
         };
@@ -79,18 +84,19 @@ std::vector<FaultTableTest::Row> FaultTableTest::table() {
     using Action = Fault::Action;
     const std::string timeout = "Timeout Error";
     const std::string disabled = "Access to the KD is disabled at this moment.";
-    const auto answered = [this](bool succeeds, uint32_t code) {
-        return [=, this] { m_backend->capabilityAnswer = {succeeds, code, "answered"}; };
-    };
     std::vector<Row> rows = {
         // New: the image is being verified.
         {"no adapters", order(Operation::Enumerate, Action::Fail), 5},
         {"target look-up", strike("enumerateAdapters", On::Request, How::Throw), 5},
         {"preparation throws", strike("prepareFlashImage", On::Request, How::Throw), 2, 0, 0, "", "", true},
+        // The type of a refusal, which alone does not say that nothing was done to the adapter.
+        {"preparation refuses", strike("prepareFlashImage", On::Request, How::Refuse), 5, 0, 0, "",
+         "Exception: 'SMASHv2:EInvalidParameter:odd'", true},
         {"preparation stalls", strike("prepareFlashImage", On::Request, How::Stall), kJobStarted, 7},
-        {"preparation fails", [this] { m_backend->prepareStatus = 6; }, 2},
+        {"preparation fails", [this] { m_backend->prepareStatus = 6; }, 2, 0, 0, "",
+         "Unspecified Error for '"},
         // Starting: the job leaves the list at once.
-        {"no thread", [] { test::refusesThreads = true; }, kFailed, 0, 0, "", "Thread start error"},
+        {"no thread", [] { test::refusesThreads = true; }, kFailed, 0, 0, "", "Failed to start job for '"},
         // Running.
         {"no locker", [this] { m_locker.reset(); }, kJobStarted, 10, 4, timeout, disabled},
         {"locker is busy", [this] { m_busy.emplace(); }, kJobStarted, 7},
@@ -102,8 +108,10 @@ std::vector<FaultTableTest::Row> FaultTableTest::table() {
         {"write stalls", order(Operation::Write, Action::Stall, 50), kJobStarted, 7},
         {"write loses power", order(Operation::Write, Action::PowerLoss, 50), kJobStarted, 10, 4, timeout},
         {"word fails", order(Operation::CapabilityWord, Action::Fail), kJobStarted, 10, 17, "on order"},
-        {"word fails widely", answered(false, 0x10005), kJobStarted, 10, 5, "answered"},
-        {"word succeeds with a text", answered(true, 9), kJobStarted, 7, 9, "answered"},
+        {"word fails widely", order(Operation::CapabilityWord, Action::Fail, 0, 0x10005), kJobStarted, 10, 5,
+         "on order"},
+        {"word succeeds with a text", [this] { m_backend->capabilityText = "worn"; }, kJobStarted, 7, 0,
+         "worn"},
         {"progress throws", strike("getFlashImageUpdateProgress", On::Request, How::Throw), kJobStarted, 7},
         {"progress stalls", strike("getFlashImageUpdateProgress", On::Request, How::Stall), kJobStarted, 7},
     };
@@ -120,7 +128,7 @@ std::vector<FaultTableTest::Row> FaultTableTest::table() {
 void FaultTableTest::disarm() {
     m_backend->hook = nullptr;
     m_backend->prepareStatus.reset();
-    m_backend->capabilityAnswer.reset();
+    m_backend->capabilityText.reset();
     m_adapters->clearFaults("eth4");
     test::refusesThreads = false;
     m_busy.reset();

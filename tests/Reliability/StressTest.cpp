@@ -1,6 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
 // Many clients at once, while adapters are being written to and files come and go.
-#include <algorithm>
 #include <filesystem>
 #include <functional>
 #include <random>
@@ -37,7 +36,7 @@ class StressTest : public test::UpdateTest {
     void cleanUp();
 
     std::atomic<int> m_writing{0};
-    std::atomic<int> m_mostWriting{0};
+    std::atomic<bool> m_wroteTwoAtOnce{false};
     std::atomic<std::uint64_t> m_writes{0};
     std::atomic<std::uint64_t> m_requestCount{0};
     std::atomic<std::uint64_t> m_started{0};
@@ -48,19 +47,12 @@ class StressTest : public test::UpdateTest {
   private:
     void client(unsigned seed);
     void act(Random& random);
-    /// Some path of the model; none where the class has no instances.
-    std::optional<CimPath> pickPath(Random& random) const;
     void startInstall(Random& random);
     void check(Random& random);
     void deleteSome(Random& random);
 
-    struct Target {
-        const char* adapter;
-        std::string uri;
-    };
-
     const test::LogLevelGuard m_silent{0};
-    std::vector<Target> m_targets;
+    std::vector<std::pair<const char*, std::string>> m_targets;  ///< adapters and images for them
     std::vector<std::string> m_classes;
     std::atomic<bool> m_stop{false};
 };
@@ -78,23 +70,14 @@ StressTest::StressTest() {
     m_backend->hook = [this](const std::string& operation, const std::string&) {
         if (operation == "updateCapabilityWord") --m_writing;
         if (operation != "writeFlashImage") return;
-        const int writing = ++m_writing;
-        for (int most = m_mostWriting;
-             writing > most && !m_mostWriting.compare_exchange_weak(most, writing);) {
-        }
+        if (++m_writing > 1) m_wroteTwoAtOnce = true;
         utils::Thread::msleep(static_cast<unsigned>(m_writes++ % 4));
     };
 }
 
-std::optional<CimPath> StressTest::pickPath(Random& random) const {
-    const auto paths = m_requests.enumerateInstanceNames(pick(m_classes, random));
-    if (paths.empty()) return std::nullopt;
-    return pick(paths, random);
-}
-
 void StressTest::startInstall(Random& random) {
-    const Target& target = pick(m_targets, random);
-    const CallResult result = install(target.uri, port(target.adapter), {5, 3});
+    const auto& [adapter, uri] = pick(m_targets, random);
+    const CallResult result = install(uri, port(adapter), {5, 3});
     EXPECT_EQ(result.error, "");
     if (result.job) {
         ++m_started;
@@ -111,7 +94,7 @@ void StressTest::check(Random& random) {
     const auto sources = m_requests.enumerateInstanceNames("Quenx_SoftwareIdentity");
     const CallResult result =
         call("CheckSoftwareIdentity", {test::pathArgument("Source", pick(sources, random)),
-                                       test::pathArgument("Target", port(pick(m_targets, random).adapter))});
+                                       test::pathArgument("Target", port(pick(m_targets, random).first))});
     EXPECT_EQ(result.error, "");
     if (result.returnValue == 0) ++m_checked;
 }
@@ -131,12 +114,13 @@ void StressTest::act(Random& random) {
     const auto action = random() % 8;
     if (action == 0) m_requests.enumerateInstances(pick(m_classes, random));
     if (action == 1 || action == 2) {
-        const auto path = pickPath(random);
-        if (!path) return;
-        m_requests.getInstance(*path);
-        m_requests.associators(*path, {});
-        m_requests.referenceNames(*path, {});
-        m_requests.references(*path, {pick(m_classes, random), "", "", ""});
+        const auto paths = m_requests.enumerateInstanceNames(pick(m_classes, random));
+        if (paths.empty()) return;
+        const CimPath& path = pick(paths, random);
+        m_requests.getInstance(path);
+        m_requests.associators(path, {});
+        m_requests.referenceNames(path, {});
+        m_requests.references(path, {pick(m_classes, random), "", "", ""});
     }
     if (action == 3) check(random);
     if (action == 4) deleteSome(random);
@@ -172,8 +156,7 @@ void StressTest::run(std::chrono::milliseconds time, const std::function<bool()>
     std::vector<std::thread> threads;
     for (unsigned i = 0; i < clients; ++i)
         threads.emplace_back([this, i] { client(i + 1); });
-    const auto limit = begin + std::max<Clock::duration>(time * 20, std::chrono::minutes(1));
-    while (Clock::now() < begin + time || (!isEnough() && Clock::now() < limit))
+    while (Clock::now() < begin + time || !isEnough())
         utils::Thread::msleep(5);
     m_stop = true;
     for (std::thread& thread : threads)
@@ -197,18 +180,14 @@ TEST_F(StressTest, LosesNothing) {
     const std::int64_t before = test::liveBytes();
 
     const std::uint64_t wanted = m_started + test::effort.jobs;
-    // On a busy machine the rarer outcomes need longer to come.
+    // Ends only when every outcome has come: on a busy machine the rarer ones take longer.
     run(test::effort.stress,
         [&] { return m_started >= wanted && m_refused > 0 && m_checked > 0 && m_deleted > 0; });
     cleanUp();
     // But for the room that lists keep for more elements: a job takes about 10 KB.
     EXPECT_LT(test::liveBytes() - before, 1000);
-    EXPECT_EQ(m_mostWriting, 1);
+    EXPECT_FALSE(m_wroteTwoAtOnce);
     EXPECT_EQ(claim(), "");
-    EXPECT_GE(m_started, test::effort.jobs);
-    EXPECT_GT(m_refused, 0U);
-    EXPECT_GT(m_checked, 0U);
-    EXPECT_GT(m_deleted, 0U);
     // Every job that was started has run, and each flash has ended well.
     EXPECT_EQ(static_cast<std::uint64_t>(JobThread::executionCount - executionsBefore), m_started);
     EXPECT_EQ(m_writes, m_started);

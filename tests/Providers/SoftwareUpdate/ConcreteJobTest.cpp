@@ -3,8 +3,9 @@
 
 #include <gtest/gtest.h>
 
-#include "Providers/SoftwareUpdate/JobThread.h"
+#include "Framework/Classes/InstanceLifetime.h"
 #include "Providers/SoftwareUpdate/MethodResults.h"
+#include "Providers/SoftwareUpdate/Quenx_ConcreteJobClass.h"
 #include "Providers/SoftwareUpdate/UpdateTest.h"
 #include "Support/TestRoms.h"
 
@@ -40,6 +41,7 @@ TEST_F(ConcreteJobTest, StartsNewAndIsStartedOnce) {
     };
     const auto job = makeJob();
     EXPECT_EQ(claim(), "eth0");
+    EXPECT_NE(job->getFlashImage(), nullptr);
     job->refresh();
     EXPECT_EQ(job->JobState.get(), JobStateNew);
     EXPECT_EQ(job->PercentComplete.get(), 0);
@@ -47,93 +49,52 @@ TEST_F(ConcreteJobTest, StartsNewAndIsStartedOnce) {
     EXPECT_TRUE(job->ElapsedTime.get().isPeriod());
     EXPECT_EQ(core::datetimeText(job->TimeBeforeRemoval.get()), "00000000000500.000000:000");
     EXPECT_EQ(core::datetimeText(job->StartTime.get()).substr(21), "+000");
-    EXPECT_EQ(job->Caption.get(), "Firmware Update Job 7");
     EXPECT_EQ(job->Name.get(), "Firmware Update Job 7");
-    EXPECT_TRUE(job->Owner.IsNull());
-    EXPECT_TRUE(job->MethodName.IsNull());
     for (const int other : {3, 4, 5, 0})
         EXPECT_EQ(job->requestStateChange(static_cast<RequestedState>(other), utils::Time()), 5U);
     run(*job);
     job->refresh();
     EXPECT_EQ(job->JobState.get(), JobStateCompleted);
     EXPECT_EQ(job->PercentComplete.get(), 100);
+    EXPECT_EQ(claim(), "");
+    EXPECT_EQ(job->getFlashImage(), nullptr) << "it has megabytes";
     EXPECT_EQ(asked, 0) << "the adapter is asked for the progress only while it is written to";
     EXPECT_EQ(job->requestStateChange(RequestedStateStart, utils::Time()), 4097U);
     EXPECT_TRUE(test::SyslogCapture::contains("Cannot start job that is not in 'NEW' state"));
-    EXPECT_THROW(job->threadControl(ThreadStart, 0), utils::Exception);
-    EXPECT_THROW(job->threadControl(ThreadTerminate, 0), utils::Exception);
-    EXPECT_FALSE(job->threadControl(static_cast<ThreadOperationCommand>(9), 0));
-}
-
-TEST_F(ConcreteJobTest, StatesDecideOverTheClaim) {
-    for (int state = 0; state <= 13; ++state) {
-        const bool releases = state == 6 || state == 7 || state == 10;
-        setClaim("");
-        const auto job = makeJob();
-        job->setJobState(static_cast<JobStateVal>(state));
-        EXPECT_EQ(claim().empty(), releases) << state;
-        EXPECT_EQ(job->getFlashImage() == nullptr, releases) << state;
-        EXPECT_EQ(job->getFlashImageSize() == 0, releases) << state;
-        EXPECT_TRUE(logged("2 -> " + std::to_string(state)));
-    }
 }
 
 TEST_F(ConcreteJobTest, TheBootTypeStaysUnlessAnUpdateRemovesIscsi) {
     // The update that removes it is in the fault table.
-    std::atomic<int> resets{0};
-    m_backend->hook = [&](const std::string& operation, const std::string&) {
-        if (operation == "setBootType") ++resets;
+    m_backend->hook = [](const std::string& operation, const std::string&) {
+        EXPECT_NE(operation, "setBootType");
     };
     const auto iscsi = madeRom({{FirmwareType::iSCSI, 2}, {FirmwareType::UEFI, 1}}, 0x15ad, 0x07b0);
-    m_options = {32768, 5};
-    m_values = {"IMG_iSCSI+IMG_UEFI"};
     run(*makeJob("eth4", file("iscsi.rom", iscsi)));
-    m_values = {"IMG_PXE+IMG_UEFI"};
     run(*makeJob());
-    EXPECT_EQ(resets, 0);
-}
-
-TEST_F(ConcreteJobTest, AWorkerThatFlashesIsWaitedForAndNotStopped) {
-    m_backend->hold("writeFlashImage");
-    auto job = makeJob();
-    job->requestStateChange(RequestedStateStart, utils::Time());
-    m_backend->waitUntilHeld();
-    EXPECT_TRUE(job->threadControl(ThreadTerminate, 50));  // always true for a multiple of 50
-    EXPECT_FALSE(job->threadControl(ThreadTerminate, 30));
-    test::SyslogCapture::observe([&](const std::string& line) {
-        if (line.find("waiting for terminate") != std::string::npos) m_backend->letGo();
-    });
-    job.reset();
-    test::SyslogCapture::observe(nullptr);
-    EXPECT_TRUE(test::SyslogCapture::contains(", terminated"));
-    EXPECT_EQ(test::componentsOf("eth0"), "IMG_PXE 2, IMG_UEFI 1");
-    EXPECT_EQ(claim(), "");
 }
 
 TEST_F(ConcreteJobTest, ReadsTargetTypesFromTheOptions) {
     struct Row {
         std::vector<std::uint16_t> options;
         std::vector<std::string> values;
-        std::vector<int> types;
+        std::vector<FirmwareType> types;
     };
+    using enum FirmwareType;
     for (const Row& row : std::vector<Row>{
              {{5}, {"IMG_PXE"}, {}},
-             {{32768}, {" IMG_PXE\t+ IMG_UEFI "}, {3, 4}},
-             {{32768}, {"IMG_UEFI+IMG_PXE+IMG_UEFI"}, {4, 3, 4}},
-             {{32768}, {"IMG_PXE+"}, {3, 0}},
-             {{32768}, {""}, {0}},
+             {{32768}, {" IMG_PXE\t+ IMG_UEFI "}, {PXE, UEFI}},
+             {{32768}, {"IMG_UEFI+IMG_PXE+IMG_UEFI"}, {UEFI, PXE, UEFI}},
+             {{32768}, {"IMG_PXE+"}, {PXE, None}},
+             {{32768}, {""}, {None}},
              {{5, 32768}, {"IMG_PXE"}, {}},
-             {{32768, 5, 32768}, {"IMG_CLP", "x", "IMG_FCoE+IMG_iSCSI"}, {1, 5, 2}},
-             {{32768, 32768}, {"IMG_CLP"}, {1}},  // the second has no value
+             {{32768, 5, 32768}, {"IMG_CLP", "x", "IMG_FCoE+IMG_iSCSI"}, {CLP, FCoE, iSCSI}},
+             {{32768, 32768}, {"IMG_CLP"}, {CLP}},  // the second has no value
          }) {
         m_options = row.options;
         m_values = row.values;
-        std::vector<int> types;
-        for (const FirmwareType type : Quenx_ConcreteJob::getTargetTypes(m_options, m_values))
-            types.push_back(static_cast<int>(type));
-        EXPECT_EQ(types, row.types);
+        EXPECT_EQ(Quenx_ConcreteJob::getTargetTypes(m_options, m_values), row.types);
     }
-    EXPECT_TRUE(logged("Return result[3]=%d"));
+    EXPECT_TRUE(test::SyslogCapture::contains("\"Return result[3]=%d\""));
 
     setClaim("eth1");
     m_options = {32768};
@@ -182,6 +143,36 @@ TEST_F(ConcreteJobTest, TheStatusOfThePreparationDecides) {
         EXPECT_TRUE(row.error.empty() ? error.empty() : error.starts_with("SMASHv2:" + row.error)) << error;
         EXPECT_EQ(claim(), error.empty() ? "eth0" : "");
     }
+}
+
+TEST_F(ConcreteJobTest, CountsRefusedRequestsToo) {
+    EXPECT_EQ(install("nonsense", "eth0").returnValue, 5U);
+    EXPECT_EQ(waitForEnd(*install(goodImage(), "eth0").job).path.toString(),
+              "root/cimv2:Quenx_ConcreteJob.InstanceID=\"Quenx:FirmwareUpdate@Job#2\"");
+    EXPECT_TRUE(test::SyslogCapture::contains("Exception: 'SMASHv2:EInvalidUri:URI: nonsense is invalid'"));
+}
+
+TEST_F(ConcreteJobTest, IsAllThatCanBeDeletedAndFlashesOn) {
+    auto& registry = static_cast<Quenx_ConcreteJobClass&>(
+        *utils::Singleton<ConcreteJobFactory>::getInstance()->getCimClass());
+    for (core::CimPath path : {port("eth0"), core::CimPath(std::string("!"))})
+        EXPECT_EQ(registry.DeleteInstance(path), 90);
+    EXPECT_THROW(m_requests.deleteInstance(service()), core::CimError);
+
+    m_backend->hold("writeFlashImage");
+    core::CimPath running = *install(goodImage(), "eth0").job;
+    EXPECT_EQ(registry.DeleteInstance(running), 0);
+    EXPECT_EQ(registry.DeleteInstance(running), 90);
+    EXPECT_TRUE(test::SyslogCapture::contains(
+        "Quenx_ConcreteJobe_Provider.DeleteInstance: instance not found '" + running.toString() + "' (%s)"));
+    EXPECT_TRUE(m_requests.enumerateInstances("Quenx_ConcreteJob").empty());
+    // The adapter stays claimed until the flash has ended.
+    EXPECT_EQ(install(goodImage(), "eth1").returnValue, 2U);
+    EXPECT_EQ(claim(), "eth0");
+    m_backend->letGo();
+    core::drainReaper();
+    EXPECT_EQ(claim(), "");
+    EXPECT_EQ(test::componentsOf("eth0"), "IMG_PXE 2, IMG_UEFI 1");
 }
 
 }  // namespace

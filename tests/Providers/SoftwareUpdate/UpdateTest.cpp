@@ -1,8 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Providers/SoftwareUpdate/UpdateTest.h"
 
-#include <algorithm>
-
 #include "Framework/Classes/InstanceLifetime.h"
 #include "Support/TestRoms.h"
 
@@ -44,11 +42,6 @@ std::string UpdateTest::file(const std::string& name, const std::vector<std::uin
 
 std::string UpdateTest::goodImage() const {
     return file("good.rom", madeRom({{utils::FirmwareType::PXE, 2}, {utils::FirmwareType::UEFI, 1}}));
-}
-
-bool UpdateTest::logged(const std::string& message) {
-    const auto lines = SyslogCapture::messages();
-    return std::find(lines.begin(), lines.end(), message) != lines.end();
 }
 
 }  // namespace test

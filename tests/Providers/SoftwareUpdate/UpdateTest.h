@@ -39,7 +39,6 @@ class UpdateTest : public ::testing::Test, public UpdateClient {
 
     static std::string claim() { return Quenx_ConcreteJob::m_servicedAdapter.get(); }
     static void setClaim(const std::string& adapter) { Quenx_ConcreteJob::m_servicedAdapter = adapter; }
-    static bool logged(const std::string& message);
 
     TempFolder m_folder;
     utils::SMASHv2Config m_config;
