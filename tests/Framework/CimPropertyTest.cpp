@@ -39,30 +39,6 @@ TEST(CimPropertyTest, ChecksAllOfAModificationFirst) {
     EXPECT_THROW(gadget.Codes.setValue(tooLarge), core::CimError);
 }
 
-/// Two classes over one binding, each with a property of its own.
-struct Heavy : test::Thing {
-    core::CimPropertyUint32 Weight{"Weight", this};
-};
-struct Coloured : test::Thing {
-    core::CimPropertyString Caption{"Caption", this};
-    Coloured() { Caption.setKey(); }
-};
-
-TEST(CimPropertyTest, IsServedByItsOwnClassOnly) {
-    const auto names = [](const std::vector<core::CimProperty*>& properties) {
-        std::string joined;
-        for (const core::CimProperty* each : properties)
-            joined += std::string(each->getName()) + " ";
-        return joined;
-    };
-    const Heavy heavy;
-    EXPECT_EQ(names(heavy.getProperties()), "ID Caption Codes Weight ");
-    const Coloured coloured;
-    EXPECT_EQ(names(coloured.getProperties()), "ID Codes Caption ");
-    EXPECT_EQ(names(coloured.getKeys()), "Caption ");
-    EXPECT_EQ(names(heavy.getKeys()), "");
-}
-
 TEST(CimPropertyTest, RefersToATargetThatHasGone) {
     core::InstanceList list;
     auto* target = new test::Gadget("t");

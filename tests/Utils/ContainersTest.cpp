@@ -3,7 +3,6 @@
 
 #include <gtest/gtest.h>
 
-#include <thread>
 #include <vector>
 
 #include "Support/SyslogCapture.h"
@@ -81,22 +80,4 @@ TEST_F(SafeListTest, DeletesFrontToBackAndSkipsNullWhenOwning) {
         owning.add(new Element(deleted, 3));
     }
     EXPECT_EQ(deleted, (std::vector<int>{1, 2, 3}));
-}
-
-TEST_F(SafeListTest, LetsManyThreadsAddWalkAndClear) {
-    std::vector<std::thread> threads;
-    for (int i = 0; i < 4; ++i) {
-        threads.emplace_back([&] {
-            for (int round = 0; round < 500; ++round) {
-                list.add(&one);
-                List::Iterator iterator = list.getElements();
-                for (Element* element = iterator.first(); element != nullptr; element = iterator.next()) {
-                    ASSERT_EQ(element, &one);
-                }
-                if (round % 50 == 0) list.clear();
-            }
-        });
-    }
-    for (std::thread& thread : threads)
-        thread.join();
 }

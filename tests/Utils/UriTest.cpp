@@ -41,9 +41,4 @@ TEST(UriTest, GivesSchemePathAndLogLine) {
         EXPECT_EQ(uri.IsUriSupported(), row.scheme == Scheme::File);
         EXPECT_EQ(test::SyslogCapture::messages(), row.line == nullptr ? Lines{} : Lines{row.line});
     }
-    // A malformed text keeps the path.
-    Uri uri("file:///x");
-    uri.parseUri("nonsense");
-    EXPECT_FALSE(uri.IsUriSupported());
-    EXPECT_EQ(uri.getSourcePath(), "/x");
 }

@@ -4,8 +4,6 @@
 #include <gtest/gtest.h>
 #include <sys/stat.h>
 
-#include <thread>
-
 #include "Support/SyslogCapture.h"
 #include "Support/TempFolder.h"
 
@@ -86,22 +84,4 @@ TEST_F(SMASHv2ConfigTest, BuildsDirectoriesAnewFromEveryLine) {
               (Lines{"Adding path-> " + one, "Adding path-> " + two, "Adding path-> " + three}));
     write("");
     EXPECT_TRUE(config.getFirmwareFilesPaths().empty());
-}
-
-TEST_F(SMASHv2ConfigTest, AnswersManyThreadsWhileTheFileChanges) {
-    test::LogLevelGuard quiet(0);
-    std::vector<std::thread> threads;
-    for (int i = 0; i < 4; ++i) {
-        threads.emplace_back([&] {
-            for (int round = 0; round < 100; ++round) {
-                EXPECT_EQ(config.getNamespace().substr(0, 4), "root");
-                config.isDowngradeEnabled();
-                config.getFirmwareFilesPaths();
-            }
-        });
-    }
-    for (int round = 0; round < 50; ++round)
-        write("Namespace=root/" + std::string(1000, 'x') + "\nFWFilePath=/tmp\n");
-    for (std::thread& thread : threads)
-        thread.join();
 }
