@@ -1,15 +1,15 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include <set>
 #include <string>
-#include <vector>
 
 namespace test {
 
 /// A file of tests/CimXml/samples: requests as clients sent them ("w-": one that sends no types, "p-": one
 /// that does).
 std::string readSample(const std::string& name);
-std::vector<std::string> sampleNames();
+std::set<std::string> sampleNames();
 
 /// What is wrong with a message, by the document type in cimxml.dtd and by what common clients cannot read;
 /// empty when nothing is.

@@ -17,19 +17,13 @@ using std::chrono::seconds;
 
 TEST(ImageUriTest, LeavesUrisAloneAndEncodesNothing) {
     const std::string here = std::filesystem::current_path().string();
-    const struct {
-        const char* image;
-        std::string uri;
-    } rows[] = {
-        {"/a b%20c:d::e", "file:///a b%20c:d::e"},
-        {"x.rom", "file://" + here + "/x.rom"},
-        {"a:b.rom", "file://" + here + "/a:b.rom"},
-        {"FILE:///x", "FILE:///x"},
-        {"file:/x", "file:/x"},
-        {"://x", "file://" + here + "/://x"},
-    };
-    for (const auto& row : rows)
-        EXPECT_EQ(cli::imageUri(row.image), row.uri);
+    const std::pair<const char*, std::string> rows[] = {{"/a b%20c:d::e", "file:///a b%20c:d::e"},
+                                                        {"a:b.rom", "file://" + here + "/a:b.rom"},
+                                                        {"FILE:///x", "FILE:///x"},
+                                                        {"file:/x", "file:/x"},
+                                                        {"://x", "file://" + here + "/://x"}};
+    for (const auto& [image, uri] : rows)
+        EXPECT_EQ(cli::imageUri(image), uri);
     EXPECT_EQ(cli::localPath("FILE:///a::b"), "/a::b");
 }
 

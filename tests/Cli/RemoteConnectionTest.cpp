@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 // Answers that no server should give.
 #include <arpa/inet.h>
-#include <gtest/gtest.h>
+#include <gmock/gmock.h>
 #include <sys/socket.h>
 #include <unistd.h>
 
@@ -12,6 +12,9 @@
 #include "Cli/Connection/Connection.h"
 
 namespace {
+
+using ::testing::StrEq;
+using ::testing::ThrowsMessage;
 
 /// Answers one request on loopback, whatever it asks.
 class OneAnswer {
@@ -74,41 +77,23 @@ std::string message(const std::string& id, const std::string& content) {
     return "<MESSAGE ID='" + id + "' PROTOCOLVERSION='1.0'><SIMPLERSP>" + content + "</SIMPLERSP></MESSAGE>";
 }
 
-/// Calls the method X; "" when the answer is taken.
-std::string faultOfMethod(const std::string& response) {
-    const OneAnswer server(response);
-    try {
-        server.connect().operations->invokeMethod(core::CimPath("Y.Name=\"1\""), "X", {});
-        return "";
-    } catch (const cli::NoAnswer& error) {
-        return error.what();
-    }
-}
-
 TEST(RemoteConnectionTest, TakesNoAnswerForAnotherRequestsOrForNothing) {
     const std::string returned = "<RETURNVALUE><VALUE>0</VALUE></RETURNVALUE></METHODRESPONSE>";
-    const std::string other = "The server's answer belongs to another request.";
-    EXPECT_EQ(faultOfMethod(message("1", "<METHODRESPONSE NAME='x'>" + returned)), "");
-    EXPECT_EQ(faultOfMethod(message("1", "<METHODRESPONSE NAME='Z'>" + returned)), other);
-    EXPECT_EQ(faultOfMethod(message("2", "<METHODRESPONSE NAME='X'>" + returned)), other);
-    EXPECT_EQ(faultOfMethod(message("1", "<IMETHODRESPONSE NAME='X'/>")),
-              "The server's answer is not that of a method.");
-    EXPECT_EQ(faultOfMethod(message("1", "<METHODRESPONSE NAME='X'/>")),
-              "The server's answer cannot be read: element METHODRESPONSE has no RETURNVALUE.");
+    const char* const other = "The server's answer belongs to another request.";
+    const auto call = [](const std::string& response) {
+        OneAnswer(response).connect().operations->invokeMethod(core::CimPath("Y.Name=\"1\""), "X", {});
+    };
+    call(message("1", "<METHODRESPONSE NAME='x'>" + returned));
+    const std::pair<std::string, const char*> table[] = {
+        {message("1", "<METHODRESPONSE NAME='Z'>" + returned), other},
+        {message("2", "<METHODRESPONSE NAME='X'>" + returned), other},
+        {message("1", "<IMETHODRESPONSE NAME='X'/>"), "The server's answer is not that of a method."},
+        {message("1", "<METHODRESPONSE NAME='X'/>"),
+         "The server's answer cannot be read: element METHODRESPONSE has no RETURNVALUE."}};
+    for (const auto& row : table)
+        EXPECT_THAT([&] { call(row.first); }, ThrowsMessage<cli::NoAnswer>(StrEq(row.second)));
     const OneAnswer server(message("1", "<METHODRESPONSE NAME='EnumerateInstanceNames'>" + returned));
     EXPECT_THROW(server.connect().operations->enumerateInstanceNames("Y"), cli::NoAnswer);
-}
-
-/// The error that mof meets with these elements CLASS.
-std::string faultOfClasses(const std::string& classes) {
-    const OneAnswer server(message("1", "<IMETHODRESPONSE NAME='EnumerateClasses'><IRETURNVALUE>" + classes +
-                                            "</IRETURNVALUE></IMETHODRESPONSE>"));
-    try {
-        server.connect().operations->enumerateClasses("", true);
-        return "";
-    } catch (const core::CimError& error) {
-        return error.what();
-    }
 }
 
 std::string classBelow(const std::string& name, const std::string& superclass) {
@@ -116,14 +101,21 @@ std::string classBelow(const std::string& name, const std::string& superclass) {
 }
 
 TEST(RemoteConnectionTest, BuildsNoEndlessChainsOfClasses) {
-    EXPECT_EQ(faultOfClasses(classBelow("A", "B") + classBelow("B", "Elsewhere")), "");
-    EXPECT_EQ(faultOfClasses(classBelow("A", "a")), "class A is its own superclass");
-    EXPECT_EQ(faultOfClasses(classBelow("A", "B") + classBelow("B", "C") + classBelow("C", "B")),
-              "class B is its own superclass");
+    const auto read = [](const std::string& classes) {
+        const OneAnswer server(message("1", "<IMETHODRESPONSE NAME='EnumerateClasses'><IRETURNVALUE>" +
+                                                classes + "</IRETURNVALUE></IMETHODRESPONSE>"));
+        server.connect().operations->enumerateClasses("", true);
+    };
+    read(classBelow("A", "B") + classBelow("B", "Elsewhere"));
     std::string line;
     for (int i = 0; i < 20000; ++i)
         line += classBelow("C" + std::to_string(i), "C" + std::to_string(i + 1));
-    EXPECT_EQ(faultOfClasses(line), "class C0 has too many superclasses");
+    const std::pair<std::string, const char*> table[] = {
+        {classBelow("A", "a"), "class A is its own superclass"},
+        {classBelow("A", "B") + classBelow("B", "C") + classBelow("C", "B"), "class B is its own superclass"},
+        {line, "class C0 has too many superclasses"}};
+    for (const auto& row : table)
+        EXPECT_THAT([&] { read(row.first); }, ThrowsMessage<core::CimError>(StrEq(row.second)));
 }
 
 }  // namespace

@@ -6,32 +6,18 @@
 #include "Providers/SoftwareUpdate/MethodResults.h"
 #include "Utils/Utils.h"
 
-namespace {
-
 /// The first line has the options, a character each; the others are the values.
-struct Input {
-    explicit Input(const std::string& text) {
-        utils::StringArray lines = utils::split(text, '\n');
-        for (const char c : lines.front())
-            options.push_back(c == 'T' ? 32768 : static_cast<std::uint16_t>(c - '0'));
-        values.assign(lines.begin() + 1, lines.end());
-    }
-
-    std::vector<std::uint16_t> options;
-    std::vector<std::string> values;
-};
-
-}  // namespace
-
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, size_t size) {
-    const Input input(std::string(data, data + size));
+    utils::StringArray values = utils::split(std::string(data, data + size), '\n');
+    std::vector<std::uint16_t> options;
+    for (const char c : values.front())
+        options.push_back(c == 'T' ? 32768 : static_cast<std::uint16_t>(c - '0'));
+    values.erase(values.begin());
     try {
-        std::size_t types = 0;
-        for (const utils::FirmwareType type : getTargetTypes(input.options, input.values)) {
+        const std::vector<utils::FirmwareType> types = getTargetTypes(options, values);
+        for (const utils::FirmwareType type : types)
             require(type >= utils::FirmwareType::None && type <= utils::FirmwareType::FCoE);
-            ++types;
-        }
-        require(types <= size + 1);
+        require(types.size() <= size + 1);
     } catch (const utils::EInvalidParameter&) {
         // A name that is not known: the one refusal.
     }

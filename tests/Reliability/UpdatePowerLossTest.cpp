@@ -1,5 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 // The power fails at the k-th change that an update makes to the flash, for every k.
+#include <fstream>
 #include <map>
 
 #include "Providers/SoftwareUpdate/UpdateTest.h"
@@ -87,7 +88,7 @@ class CutFiles : public ma::FlashFiles {
         for (const auto& [path, content] : medium.keepsEntries ? m_entries : m_syncedEntries) {
             if (!content || !fs::exists(fs::path(path).parent_path())) continue;
             const Bytes& bytes = medium.keepsContents ? content->now : content->synced;
-            test::writeTestFile(path, std::string(bytes.begin(), bytes.end()));
+            std::ofstream(path, std::ios::binary) << std::string(bytes.begin(), bytes.end());
         }
     }
 

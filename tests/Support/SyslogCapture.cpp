@@ -3,13 +3,13 @@
 
 #include <syslog.h>
 
+#include <algorithm>
 #include <cerrno>
 #include <cstdarg>
 #include <cstdio>
 #include <mutex>
 
 #include "Utils/Export.h"
-#include "Utils/Log.h"
 
 namespace test {
 
@@ -58,12 +58,10 @@ std::vector<SyslogLine> SyslogCapture::lines() {
 }
 
 std::size_t SyslogCapture::count(std::string_view part) {
-    std::lock_guard<std::mutex> lock(store().mutex);
-    std::size_t found = 0;
-    for (const SyslogLine& line : store().lines) {
-        if (line.text.find(part) != std::string::npos) ++found;
-    }
-    return found;
+    const std::vector<SyslogLine> all = lines();
+    return static_cast<std::size_t>(std::count_if(all.begin(), all.end(), [&](const SyslogLine& line) {
+        return line.text.find(part) != std::string::npos;
+    }));
 }
 
 std::vector<std::string> SyslogCapture::messages(std::string_view level) {
@@ -90,12 +88,6 @@ void SyslogCapture::observe(std::function<void(const std::string&)> observer) {
 void SyslogCapture::keep(bool lines) {
     std::lock_guard<std::mutex> lock(store().mutex);
     store().keepsLines = lines;
-}
-
-LogLevelGuard::LogLevelGuard(std::int32_t level) : m_saved(utils::logLevel.exchange(level)) {}
-
-LogLevelGuard::~LogLevelGuard() {
-    utils::logLevel.store(m_saved);
 }
 
 }  // namespace test

@@ -8,6 +8,8 @@
 #include <string_view>
 #include <vector>
 
+#include "Utils/Log.h"
+
 namespace test {
 
 struct SyslogLine {
@@ -41,8 +43,8 @@ class SyslogCapture {
 /// Sets utils::logLevel for a scope.
 class LogLevelGuard {
   public:
-    explicit LogLevelGuard(std::int32_t level);
-    ~LogLevelGuard();
+    explicit LogLevelGuard(std::int32_t level) : m_saved(utils::logLevel.exchange(level)) {}
+    ~LogLevelGuard() { utils::logLevel.store(m_saved); }
     LogLevelGuard(const LogLevelGuard&) = delete;
     LogLevelGuard& operator=(const LogLevelGuard&) = delete;
 

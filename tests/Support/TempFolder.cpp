@@ -23,17 +23,13 @@ TempFolder::~TempFolder() {
 
 std::string TempFolder::write(std::string_view name, std::string_view content) const {
     const std::string path = *this / name;
-    writeTestFile(path, content);
+    std::ofstream file(path, std::ios::binary);
+    EXPECT_TRUE(file << content << std::flush) << path;
     return path;
 }
 
 std::string TempFolder::write(std::string_view name, std::span<const std::uint8_t> content) const {
     return write(name, std::string(content.begin(), content.end()));
-}
-
-void writeTestFile(const std::string& path, std::string_view content) {
-    std::ofstream file(path, std::ios::binary);
-    EXPECT_TRUE(file << content << std::flush) << path;
 }
 
 std::vector<std::uint8_t> readTestFile(const std::string& path) {

@@ -21,16 +21,13 @@ class TempFolder {
     std::string path() const { return m_path.string(); }
     std::string operator/(std::string_view name) const { return (m_path / name).string(); }
 
-    /// Writes a file in the folder and returns its path.
+    /// Writes a file in the folder and returns its path; a failed expectation when that does not work.
     std::string write(std::string_view name, std::string_view content) const;
     std::string write(std::string_view name, std::span<const std::uint8_t> content) const;
 
   private:
     std::filesystem::path m_path;
 };
-
-/// Makes or replaces a file; a failed expectation when that does not work.
-void writeTestFile(const std::string& path, std::string_view content);
 
 /// All bytes of a file; a failed expectation and nothing when it cannot be read.
 std::vector<std::uint8_t> readTestFile(const std::string& path);

@@ -13,13 +13,6 @@ std::vector<std::uint8_t> realRom(std::string_view name) {
     return readTestFile(realRomPath(name));
 }
 
-std::vector<std::uint8_t> withRevision(std::vector<std::uint8_t> rom, utils::FirmwareType type,
-                                       std::uint16_t revision) {
-    for (const ma::RomImage& image : ma::parseOptionRom(rom).images)
-        if (image.carries(type)) ma::setCodeRevision(rom, image, revision);
-    return rom;
-}
-
 std::vector<std::uint8_t> withRevision(std::vector<std::uint8_t> rom, std::uint16_t revision) {
     for (const ma::RomImage& image : ma::parseOptionRom(rom).images)
         ma::setCodeRevision(rom, image, revision);

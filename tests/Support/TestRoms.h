@@ -19,10 +19,6 @@ std::string realRomPath(std::string_view name);
 /// Its bytes.
 std::vector<std::uint8_t> realRom(std::string_view name);
 
-/// A ROM with the code revision of its images of one type changed, and its sum mended.
-std::vector<std::uint8_t> withRevision(std::vector<std::uint8_t> rom, utils::FirmwareType type,
-                                       std::uint16_t revision);
-
 /// A ROM with the code revision of all its images changed.
 std::vector<std::uint8_t> withRevision(std::vector<std::uint8_t> rom, std::uint16_t revision);
 

@@ -31,37 +31,30 @@ class InventoryTest : public test::Quenxctl {
     }
 };
 
-TEST_F(InventoryTest, ListsFilesAndWhatIsInstalled) {
+TEST_F(InventoryTest, ChangesNothingByACheckAndInstallsByIdentity) {
     const std::string table = quenxctl("identities").out;
     for (const char* part : {"IMG_PXE 2, IMG_UEFI 2  IMG_PXE,IMG_UEFI  file://", "/firmware/new.rom",
-                             "/firmware/other.rom", "Firmware of adapter eth0"}) {
+                             "/firmware/other.rom", "Firmware of adapter eth0"})
         EXPECT_TRUE(contains(table, part)) << part << "\n" << table;
-    }
     EXPECT_FALSE(contains(table, "broken.rom")) << table;
-}
 
-TEST_F(InventoryTest, ChangesNothingByACheckAndInstallsByIdentity) {
     const std::string identity = " --target eth0 --identity " + idOf("1af4-1041");
-    const std::string installable = "The image can be installed on eth0.\n";
-    EXPECT_EQ(quenxctl("check" + identity).out, installable);
     // A file need not be in the inventory.
-    EXPECT_EQ(quenxctl("check --target eth0 IMAGE").out, installable);
+    for (const std::string& line : {"check" + identity, std::string("check --target eth0 IMAGE")})
+        EXPECT_EQ(quenxctl(line).out, "The image can be installed on eth0.\n");
     EXPECT_EQ(firmwareOf("eth0"), "IMG_PXE 1, IMG_UEFI 0");
     EXPECT_EQ(quenxctl("install" + identity).status, 0);
     EXPECT_EQ(firmwareOf("eth0"), "IMG_PXE 2, IMG_UEFI 2");
     EXPECT_EQ(quenxctl("check" + identity).status, 3);
     EXPECT_EQ(quenxctl("install" + identity).status, 3);
     EXPECT_EQ(quenxctl("install --force" + identity).status, 0);
-}
 
-TEST_F(InventoryTest, SaysWhatToDoAboutARefusal) {
-    const std::string image = " --identity " + idOf("1af4-1041");
     const std::string other = " --target eth0 --identity " + idOf("10ec-8139");
     expectError("check" + other, 1, "is for 10ec:8139, but eth0 is 1af4:1041.");
     expectError("install" + other, 1, "is for 10ec:8139, but eth0 is 1af4:1041.");
     expectError("check --target eth0 --identity none", 4, "There is no software identity \"none\".");
     expectError("check --target eth0 --identity " + idOf("eth0"), 4, "there is no image file of it");
-    expectError("check --target eth3" + image, 1, "cannot be updated");
+    expectError("check --target eth3 --identity " + idOf("1af4-1041"), 1, "cannot be updated");
     expectError("install --types IMG_PXE" + other, 2, "--identity cannot be used with --types.");
 }
 
@@ -84,13 +77,9 @@ std::string faultsOf(std::string mof) {
 TEST_F(InventoryTest, PrintsTheSchemaInOrderAndQualified) {
     const std::string mof = quenxctl("mof").out;
     EXPECT_EQ(faultsOf(mof), "");
-    EXPECT_EQ(faultsOf("[ New ( \"[ Old\" ), Other ]\nclass A : B {\n C REF D; };"),
-              "New is not declared\nOther is not declared\nB is not declared\nC is not declared\n");
-    for (const char* name : {"Quenx_ConcreteJob", "Quenx_SoftwareInstallationService", "CIM_Job",
-                             "Quenx_ElementSoftwareIdentity", "CIM_PortController"})
-        EXPECT_TRUE(contains(mof, "\nclass " + std::string(name) + " ")) << name;
     for (const char* part :
-         {"\"Completed\"", "\"Method Parameters Checked - Job Started\"", "[ Association,\n   Description ( ",
+         {"\nclass Quenx_ElementSoftwareIdentity ", "\nclass CIM_Job ",
+          "\"Method Parameters Checked - Job Started\"", "[ Association,\n   Description ( ",
           "Qualifier Key : boolean = false,\n    Scope(property, reference),\n    Flavor(DisableOverride, "
           "ToSubclass);\n",
           "    [ Key ]\n    CIM_ManagedElement REF Antecedent;\n",

@@ -3,37 +3,55 @@
 
 #include <gtest/gtest.h>
 
+#include <sstream>
 #include <string>
 #include <vector>
 
+#include "Support/Program.h"
 #include "Support/SimulatedAdapters.h"
 #include "Support/TempFolder.h"
 #include "Support/TestRoms.h"
-#include "System/Program.h"
 
 namespace test {
 
 /// The words of a command line: what stands between its spaces. The word IMAGE becomes the image's path.
-std::vector<std::string> wordsOf(const std::string& line, const std::string& image = "");
+inline std::vector<std::string> wordsOf(const std::string& line, const std::string& image = "") {
+    std::vector<std::string> words;
+    std::istringstream stream(line);
+    for (std::string word; std::getline(stream, word, ' ');)
+        words.push_back(word == "IMAGE" ? image : word);
+    return words;
+}
 
 /// quenxctl on simulated adapters of its own, those of SimulatedAdapters.h.
 class Quenxctl : public ::testing::Test {
   protected:
-    Quenxctl() { describeAdapters(); }
-
-    /// Writes the description, with a fault of eth0; the adapters keep what they have.
-    void describeAdapters(const std::string& fault = "");
     /// The program, the options that make its environment, and the words of the line.
-    std::vector<std::string> command(const std::string& line) const;
+    virtual std::vector<std::string> command(const std::string& line) const {
+        std::vector<std::string> words = wordsOf(line, m_image);
+        // Never the machine's own.
+        if (!contains(line, "--config")) words.insert(words.begin(), {"--config", m_configuration});
+        words.insert(words.begin(), {QUENXCTL, "--adapters", m_adapters});
+        return words;
+    }
     ProgramResult quenxctl(const std::string& line, const std::vector<std::string>& environment = {}) const {
         return run(command(line), environment);
     }
     /// Runs it, and expects this exit status and this in the error text.
-    void expectError(const std::string& line, int status, const std::string& part) const;
+    void expectError(const std::string& line, int status, const std::string& part) const {
+        const ProgramResult result = quenxctl(line);
+        EXPECT_EQ(result.status, status) << line << "\n" << result.out << result.error;
+        EXPECT_TRUE(contains(result.error, part)) << line << "\n" << result.error << "\nwanted: " << part;
+    }
     /// "IMG_PXE 1, IMG_UEFI 0": what an adapter carries, as a new process sees it.
-    std::string firmwareOf(const std::string& adapter) const;
+    std::string firmwareOf(const std::string& adapter) const {
+        const std::string table = quenxctl("adapters").out;
+        const std::size_t from = table.find("IMG_", table.find("\n" + adapter + " "));
+        return table.substr(from, table.find("  ", from) - from);
+    }
 
     TempFolder m_folder;
+    std::string m_adapters = m_folder.write("adapters.toml", kTestAdapters);
     /// The providers' settings, where a test does not name others: the defaults.
     std::string m_configuration = m_folder.write("default.conf", "");
     /// For eth0 and eth1: a real one with IMG_PXE 2 and IMG_UEFI 2.

@@ -18,35 +18,32 @@ using test::contains;
 using test::Program;
 using test::ProgramResult;
 
-class RemoteTest : public ::testing::Test {
+const std::string kInstall = "install --target eth0 IMAGE";
+
+/// The adapters are the daemon's. Its own certificate is the one to trust.
+class RemoteTest : public test::Quenxctl {
   protected:
-    std::vector<std::string> command(const std::string& line) const {
+    RemoteTest() { ::setenv("QUENXCTL_PASSWORD", "admin", 1); }
+    std::vector<std::string> command(const std::string& line) const override {
+        return trustingNobody(line + " --cacert " + (m_daemon.folder() / "cert.pem"));
+    }
+    std::vector<std::string> trustingNobody(const std::string& line) const {
         const std::string url = "https://127.0.0.1:" + std::to_string(m_daemon.httpsPort());
         std::vector<std::string> words = test::wordsOf(line, m_daemon.image());
         words.insert(words.begin(), {QUENXCTL, "--server", url, "--user", "admin"});
         return words;
     }
-    /// With the daemon's own certificate as the one to trust.
-    std::string trusting(const std::string& line) const {
-        return line + " --cacert " + (m_daemon.folder() / "cert.pem");
-    }
-    ProgramResult quenxctl(const std::string& line, const std::string& password = "admin") const {
-        return test::run(command(trusting(line)), {"QUENXCTL_PASSWORD=" + password});
-    }
-    void expectError(const std::string& line, int status, const std::string& part) const {
-        const ProgramResult result = quenxctl(line);
-        EXPECT_EQ(result.status, status) << line << result.error;
-        EXPECT_TRUE(contains(result.error, part)) << line << result.error;
-    }
 
     test::RunningDaemon m_daemon;
+    const std::string m_plainUrl = "http://127.0.0.1:" + std::to_string(m_daemon.httpPort());
+    const std::string m_flash = m_daemon.folder() / "state/eth0";
 };
 
 TEST_F(RemoteTest, UpdatesAndKeepsTheJob) {
-    const ProgramResult result = quenxctl("install --target eth0 IMAGE");
+    const ProgramResult result = quenxctl(kInstall);
     EXPECT_EQ(result.status, 0) << result.error;
     EXPECT_TRUE(contains(result.out, "eth0 was updated.\n  IMG_PXE   1 -> 2\n")) << result.out;
-    EXPECT_EQ(quenxctl("install --target eth0 IMAGE").status, 3);
+    EXPECT_EQ(quenxctl(kInstall).status, 3);
     expectError("install --target eth3 IMAGE", 1, "The firmware of eth3 cannot be updated.");
 
     const auto jobs = nlohmann::json::parse(quenxctl("jobs --json").out)["jobs"];
@@ -67,25 +64,23 @@ TEST_F(RemoteTest, UpdatesAndKeepsTheJob) {
 }
 
 TEST_F(RemoteTest, SaysWhoHoldsTheAdapters) {
-    test::HeldFlash held(m_daemon.folder() / "state/eth0");
-    Program first(command(trusting("install --target eth0 IMAGE")), Program::Output::Pipes,
-                  {"QUENXCTL_PASSWORD=admin"});
+    test::HeldFlash held(m_flash);
+    Program first(command(kInstall));
     ASSERT_TRUE(held.isWaitedFor());
-    expectError("install --target eth0 IMAGE", 1, "eth0 is being updated (Quenx:FirmwareUpdate@Job#1, ");
+    expectError(kInstall, 1, "eth0 is being updated (Quenx:FirmwareUpdate@Job#1, ");
     expectError("install --target eth1 IMAGE", 1, "eth0 is being updated (Quenx:FirmwareUpdate@Job#1, ");
     const std::string deleted = quenxctl("delete Quenx:FirmwareUpdate@Job#1").out;
     EXPECT_TRUE(contains(deleted, "Its update continues, but can no longer be followed")) << deleted;
     EXPECT_TRUE(contains(first.finish().error, "it was deleted"));
-    expectError("install --target eth0 IMAGE", 1,
+    expectError(kInstall, 1,
                 "The server refuses eth0, although no job is running: an earlier check may hold it, or ");
     expectError("install --target eth1 IMAGE", 1,
                 "or another adapter than eth1 is in use: an earlier check may hold it, or ");
 }
 
 TEST_F(RemoteTest, LeavesAnUpdateToTheServerWhenInterrupted) {
-    test::HeldFlash held(m_daemon.folder() / "state/eth0");
-    Program first(command(trusting("install --target eth0 IMAGE")), Program::Output::Pipes,
-                  {"QUENXCTL_PASSWORD=admin"});
+    test::HeldFlash held(m_flash);
+    Program first(command(kInstall));
     ASSERT_TRUE(first.waitFor("eth0: 0 %"));
     first.send(SIGINT);
     const ProgramResult left = first.finish();
@@ -95,8 +90,7 @@ TEST_F(RemoteTest, LeavesAnUpdateToTheServerWhenInterrupted) {
               "\"quenxctl jobs\" shows how far it is.\n");
     // A server that hangs must not hold its user either.
     m_daemon.program().send(SIGSTOP);
-    Program second(command(trusting("install --target eth0 IMAGE")), Program::Output::Terminal,
-                   {"QUENXCTL_PASSWORD=admin"});
+    Program second(command(kInstall), Program::Output::Terminal);
     std::this_thread::sleep_for(std::chrono::milliseconds(300));
     second.send(SIGTERM);
     const ProgramResult hung = second.finish();
@@ -111,8 +105,8 @@ TEST_F(RemoteTest, LeavesAnUpdateToTheServerWhenInterrupted) {
 
 /// The lines, whatever their order.
 std::multiset<std::string> linesOf(const std::string& text) {
-    std::multiset<std::string> lines;
     std::istringstream stream(text);
+    std::multiset<std::string> lines;
     for (std::string line; std::getline(stream, line);)
         lines.insert(line);
     return lines;
@@ -126,24 +120,22 @@ TEST_F(RemoteTest, ShowsTheSameModelAsInProcess) {
         return test::run(words).out;
     };
     const std::string names = inProcess("instances Quenx_EthernetPort --names");
-    const std::string port = names.substr(0, names.find('\n'));
+    const std::string walk = "associators " + names.substr(0, names.find('\n'));
     for (const std::string& line :
          {std::string("adapters"), std::string("identities"), std::string("mof"),
-          std::string("instances CIM_ManagedElement"),
-          "associators " + port + " --result-class Quenx_SoftwareIdentity",
-          "associators " + port + " --role Dependent --class Quenx_ElementSoftwareIdentity"}) {
+          std::string("instances CIM_ManagedElement"), walk + " --result-class Quenx_SoftwareIdentity",
+          walk + " --role Dependent --class Quenx_ElementSoftwareIdentity"}) {
         const std::string expected = inProcess(line);
         EXPECT_NE(expected, "") << line;
         EXPECT_EQ(linesOf(quenxctl(line).out), linesOf(expected)) << line;
     }
-    expectError("associators " + port + " --class No_Such", 4, "No class \"No_Such\" is served.");
+    expectError(walk + " --class No_Such", 4, "No class \"No_Such\" is served.");
     expectError("instances No_<&>\"Such", 4, "No_<&>\"Such");
 }
 
 TEST_F(RemoteTest, AnswersOperationsThatNoVerbNeeds) {
-    ::setenv("QUENXCTL_PASSWORD", "admin", 1);
     cli::ServerSettings settings;
-    settings.url.emplace("http://127.0.0.1:" + std::to_string(m_daemon.httpPort()));
+    settings.url.emplace(m_plainUrl);
     settings.user = "admin";
     const cli::Connection connection = cli::openServer(settings, [] { return false; });
     core::CimOperations& server = *connection.operations;
@@ -161,46 +153,55 @@ TEST_F(RemoteTest, AnswersOperationsThatNoVerbNeeds) {
 }
 
 TEST_F(RemoteTest, RefusesWhomItCannotTrust) {
-    const auto expect = [](const std::vector<std::string>& command, int status, const std::string& part) {
-        const ProgramResult result = test::run(command, {"QUENXCTL_PASSWORD=admin", "QUENXCTL_USER=admin"});
-        EXPECT_EQ(result.status, status) << part;
-        EXPECT_TRUE(contains(result.error, part)) << result.error;
+    const std::string tlsPort = "http://127.0.0.1:" + std::to_string(m_daemon.httpsPort());
+    const struct {
+        std::vector<std::string> command;
+        int status;
+        const char* said;
+    } table[] = {
+        {trustingNobody("adapters"), 1, "with --cacert."},
+        {trustingNobody("adapters --insecure"), 0, "WARNING: --insecure"},
+        {{QUENXCTL, "--server", m_plainUrl, "--user", "nobody", "adapters"},
+         1,
+         "does not accept the user name and password."},
+        {{QUENXCTL, "--server", tlsPort, "adapters"}, 1, "try https:// in --server."},
+        // No other host than this one, and nobody who would answer.
+        {{QUENXCTL, "--server", "http://0.0.0.0:1", "adapters"},
+         1,
+         "WARNING: http:// sends the password and everything else unencrypted."},
     };
-    expect(command("adapters"), 1, "with --cacert.");
-    expect(command("adapters --insecure"), 0, "WARNING: --insecure");
-    const std::string plain = "http://127.0.0.1:" + std::to_string(m_daemon.httpPort());
-    expect({QUENXCTL, "--server", plain, "--user", "nobody", "adapters"}, 1,
-           "does not accept the user name and password.");
-    const std::string mistaken = "http://127.0.0.1:" + std::to_string(m_daemon.httpsPort());
-    expect({QUENXCTL, "--server", mistaken, "adapters"}, 1, "try https:// in --server.");
-    // No other host than this one, and nobody who would answer.
-    expect({QUENXCTL, "--server", "http://0.0.0.0:1", "adapters"}, 1,
-           "WARNING: http:// sends the password and everything else unencrypted.");
+    for (const auto& row : table) {
+        const ProgramResult result = test::run(row.command, {"QUENXCTL_USER=admin"});
+        EXPECT_EQ(result.status, row.status) << row.said;
+        EXPECT_TRUE(contains(result.error, row.said)) << result.error;
+    }
 }
 
 TEST_F(RemoteTest, AsksForThePasswordWithoutShowingIt) {
-    Program program(command(trusting("adapters")), Program::Output::Terminal, {"QUENXCTL_PASSWORD"});
+    Program program(command("adapters"), Program::Output::Terminal, {"QUENXCTL_PASSWORD"});
     ASSERT_TRUE(program.waitFor("Password for admin: "));
     program.type("admin\n");
     const ProgramResult result = program.finish();
     EXPECT_EQ(result.status, 0) << result.out;
     EXPECT_FALSE(contains(result.out, "Password for admin: admin")) << result.out;
 
-    std::vector<std::string> ended = command("adapters");
-    ended.insert(ended.begin(), {"/bin/sh", "-c", "trap : INT; \"$@\"; stty -a", "sh"});
-    Program shell(ended, Program::Output::Terminal, {"QUENXCTL_PASSWORD"});
+    const auto inShell = [](const std::string& script, std::vector<std::string> words) {
+        words.insert(words.begin(), {"/bin/sh", "-c", script, "sh"});
+        return words;
+    };
+    Program shell(inShell("trap : INT; \"$@\"; stty -a", command("adapters")), Program::Output::Terminal,
+                  {"QUENXCTL_PASSWORD"});
     ASSERT_TRUE(shell.waitFor("Password for admin: "));
     shell.type("adm\x03");
     const std::string settings = shell.finish().out;
     EXPECT_TRUE(contains(settings, " echo ")) << settings;
 
-    for (const char* user : {"admin", ""}) {
-        const ProgramResult silent =
-            test::run({"/bin/sh", "-c", "\"$@\" </dev/null", "sh", QUENXCTL, "--server",
-                       "https://127.0.0.1:1", "--user", user, "adapters"},
-                      {"QUENXCTL_PASSWORD"});
+    for (const std::string user : {"admin", ""}) {
+        const ProgramResult silent = test::run(
+            inShell("\"$@\" </dev/null", {QUENXCTL, "--server", m_plainUrl, "--user", user, "adapters"}),
+            {"QUENXCTL_PASSWORD"});
         EXPECT_EQ(silent.status, 2);
-        EXPECT_TRUE(contains(silent.error, *user == '\0' ? "--user or the" : "variable QUENXCTL_PASSWORD"))
+        EXPECT_TRUE(contains(silent.error, user.empty() ? "--user or the" : "variable QUENXCTL_PASSWORD"))
             << silent.error;
     }
 }

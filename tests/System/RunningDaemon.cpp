@@ -17,7 +17,7 @@ RunningDaemon::RunningDaemon(const std::vector<std::string>& options,
                    "[listen]\nhttps_port = 0\nhttp = true\nhttp_port = 0\n[tls]\ngenerate = "
                    "true\n[auth]\nmethod = 'users'\n");
     setPassword("admin");
-    setPassword("guest", {"--reader"});
+    setPassword("guest", "--reader");
     m_folder.write("provider.conf", "");
     m_folder.write("adapters.toml", kTestAdapters);
     command.push_back(QUENX_CIMD);
@@ -41,20 +41,10 @@ RunningDaemon::RunningDaemon(const std::vector<std::string>& options,
     m_httpPort = portBehind(" http://127.0.0.1:");
 }
 
-void RunningDaemon::setPassword(const std::string& name, const std::vector<std::string>& options) const {
-    std::vector<std::string> command{"/bin/sh",
-                                     "-c",
-                                     "echo $0 | \"$@\"",
-                                     name,
-                                     QUENX_CIMD,
-                                     "--config",
-                                     m_folder / "quenx-cimd.toml",
-                                     "passwd",
-                                     name,
-                                     "--users",
-                                     m_folder / "users"};
-    command.insert(command.end(), options.begin(), options.end());
-    const ProgramResult result = run(command);
+void RunningDaemon::setPassword(const std::string& name, const std::string& option) const {
+    const std::string script = "echo $0 | \"$1\" --config quenx-cimd.toml passwd $0 --users users $2";
+    const ProgramResult result =
+        run({"/bin/sh", "-c", "cd \"$3\" && " + script, name, QUENX_CIMD, option, m_folder.path()});
     EXPECT_EQ(result.status, 0) << result.error;
 }
 
@@ -70,12 +60,9 @@ ProgramResult RunningDaemon::wbemcli(const std::string& operation, const std::st
     if (https) command.insert(command.end(), {"-cacert", m_folder / "cert.pem"});
     for (std::string word; words >> word;)
         command.push_back(word);
-    const std::string scheme = https ? "https://" : "http://";
-    const int port = https ? m_httpsPort : m_httpPort;
-    std::string url = scheme + user + ":" + password + "@127.0.0.1:" + std::to_string(port) + "/";
-    url += namespaceName;
-    if (!path.empty()) url += ":" + path;
-    command.push_back(url);
+    command.push_back((https ? "https://" : "http://") + user + ":" + password +
+                      "@127.0.0.1:" + std::to_string(https ? m_httpsPort : m_httpPort) + "/" + namespaceName +
+                      (path.empty() ? "" : ":" + path));
     command.insert(command.end(), arguments.begin(), arguments.end());
     return run(command);
 }
@@ -87,9 +74,8 @@ std::vector<std::string> RunningDaemon::lines(const std::string& operation, cons
     std::istringstream text(result.out);
     const std::string front = "127.0.0.1:" + std::to_string(m_httpPort) + "/" + namespaceName + ":";
     std::vector<std::string> found;
-    for (std::string line; std::getline(text, line);) {
+    for (std::string line; std::getline(text, line);)
         found.push_back(line.starts_with(front) ? line.substr(front.size()) : line);
-    }
     return found;
 }
 

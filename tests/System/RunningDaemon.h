@@ -5,9 +5,9 @@
 #include <string>
 #include <vector>
 
+#include "Support/Program.h"
 #include "Support/TempFolder.h"
 #include "Support/TestRoms.h"
-#include "System/Program.h"
 
 namespace test {
 
@@ -27,8 +27,8 @@ class RunningDaemon {
     /// An image for eth0: a real one with IMG_PXE 2 and IMG_UEFI 2.
     const std::string& image() const { return m_image; }
     Program& program() { return *m_program; }
-    /// Runs quenx-cimd passwd on the daemon's users file.
-    void setPassword(const std::string& user, const std::vector<std::string>& options = {}) const;
+    /// Runs quenx-cimd passwd on the daemon's users file, with an option if need be.
+    void setPassword(const std::string& user, const std::string& option = "") const;
 
     /// SIGTERM, and what the daemon said until its end.
     ProgramResult stop();

@@ -9,7 +9,7 @@
 namespace {
 
 using test::ProgramResult;
-using utils::FirmwareType;
+using enum utils::FirmwareType;
 
 class WrongUseTest : public test::Quenxctl {
   protected:
@@ -28,18 +28,14 @@ TEST_F(WrongUseTest, RefusesBadFilesWithTheReason) {
     std::vector<std::uint8_t> cut = test::realRom("efi-virtio");
     cut.resize(100'000);
 
-    constexpr int kNotFound = 4;
-    expectRefusal(
-        m_folder / "none",
-        "quenxctl: Cannot read " + (m_folder / "none") + ": No such file or directory.\nCheck the path.\n",
-        kNotFound);
-    expectRefusal("%n%s\n.rom", "%n%s\\x0a.rom: No such file or directory.", kNotFound);
+    const std::string none = m_folder / "none";
+    expectRefusal(none, "quenxctl: Cannot read " + none + ": No such file or directory.\nCheck the path.\n",
+                  4);
+    expectRefusal("%n%s\n.rom", "%n%s\\x0a.rom: No such file or directory.", 4);
     expectRefusal(m_folder.path(), "is a directory.\nName a complete firmware image.");
     expectRefusal(fifo, "is not a regular file.");
-    expectRefusal("/dev/zero", "is not a regular file.");
     expectRefusal(huge, "is larger than 2 GiB.");
     expectRefusal(m_folder.write("empty", ""), "is empty.");
-    expectRefusal(m_folder.write("text", "hello"), "is not a complete firmware image: ");
     expectRefusal(m_folder.write("cut", cut), "is not a complete firmware image: ");
     expectRefusal("http://host/x.rom", "does not read images over \"http:\".");
     expectRefusal("file:/x", "file:/x is not a valid file URI.\nWrite it as file:///directory/file");
@@ -47,24 +43,22 @@ TEST_F(WrongUseTest, RefusesBadFilesWithTheReason) {
 }
 
 TEST_F(WrongUseTest, RefusesWrongImagesNamingBothSides) {
+    const auto made = [&](const std::vector<utils::FirmwareVersionInfo>& components, std::uint16_t vendor,
+                          std::uint16_t device) {
+        return m_folder.write("made.rom", test::madeRom(components, vendor, device));
+    };
     // Of the same versions as what is installed, too.
-    const auto foreign = test::madeRom({{FirmwareType::PXE, 1}, {FirmwareType::UEFI, 0}}, 0x10ec, 0x8139);
-    expectRefusal(m_folder.write("foreign.rom", foreign),
+    expectRefusal(made({{PXE, 1}, {UEFI, 0}}, 0x10ec, 0x8139),
                   "The image is for 10ec:8139, but eth0 is 1af4:1041.\nGet the image made for 1af4:1041.");
-    ma::NewRomImage vga;
-    vga.type = FirmwareType::PXE;
-    vga.vendorId = 0x1af4;
-    vga.deviceId = 0x1041;
-    vga.classCode = 0x030000;
+    const ma::NewRomImage vga{
+        .type = PXE, .vendorId = 0x1af4, .deviceId = 0x1041, .furtherDeviceIds = {}, .classCode = 0x030000};
     expectRefusal(m_folder.write("vga.rom", ma::makeRomImage(vga)),
                   "is for a device that is not a network adapter.");
     // The ids match.
-    const auto fixed = test::madeRom({{FirmwareType::PXE, 2}}, 0x1022, 0x2000);
-    expectError("install --target eth3 " + m_folder.write("fixed.rom", fixed), 1,
+    expectError("install --target eth3 " + made({{PXE, 2}}, 0x1022, 0x2000), 1,
                 "quenxctl: The firmware of eth3 cannot be updated.\n");
 
-    const auto pxe = test::madeRom({{FirmwareType::PXE, 2}}, 0x15ad, 0x07b0);
-    const std::string differing = "check --target eth4 " + m_folder.write("pxe.rom", pxe);
+    const std::string differing = "check --target eth4 " + made({{PXE, 2}}, 0x15ad, 0x07b0);
     const std::string types =
         "The image types differ: the image has IMG_PXE, which eth4 does not: it has IMG_iSCSI 1, IMG_UEFI "
         "0.\n";
@@ -92,11 +86,10 @@ TEST_F(WrongUseTest, SaysWhatIsWrongWithACommandLineAndWhatToDo) {
         {"install --target eth7 IMAGE", 4, "\nThe adapters are eth0, eth1, eth2, eth3, eth4."},
         {"install --target EHT2 IMAGE", 4, "\"EHT2\".\nDid you mean eth2? The adapters are eth0, "},
         {"install --target 0001:03:00.0 IMAGE", 4, "There is no adapter \"0001:03:00.0\"."},
-        {"install --target X.A= IMAGE", 4, "There is no adapter \"X.A=\"."},
-        {"install --target eth0 IMAGE --types IMG_FCoE", 1, "no IMG_FCoE.\nIt has IMG_PXE, IMG_UEFI.\n"},
+        {"install --target eth0 IMAGE --types IMG_PXE,IMG_FCoE", 1,
+         "no IMG_FCoE.\nIt has IMG_PXE, IMG_UEFI.\n"},
         {"install --target eth0 IMAGE --types img_pxe", 2, "Did you mean IMG_PXE? The types are"},
         {"install --target eth0", 2, "Name one image, either as a file or with --identity."},
-        {"install --target eth0 IMAGE --identity x", 2, "Name one image, either"},
         {"install IMAGE", 2, "--target is required"},
         {"install IMAGE --target", 2, "--target needs a value.\n\"quenxctl help install\" lists"},
         {"install --target eth0 IMAGE --target eth1", 2, "--target can be given only once."},
@@ -105,14 +98,12 @@ TEST_F(WrongUseTest, SaysWhatIsWrongWithACommandLineAndWhatToDo) {
         {"adapters --target eth0", 2, "\"adapters\" has no option \"--target\"."},
         {"adapters --json=maybe", 2, "--json takes no value."},
         {"--jsno", 2, "There is no option \"--jsno\".\nDid you mean --json? "},
-        {"isntall --traget eth0", 2, "There is no verb \"isntall\"."},
         {"adapters --user a", 2, "--user requires --server"},
         {"adapters --server https://host", 2, " cannot be used with "},
-        {"isntall", 2, "There is no verb \"isntall\".\nDid you mean install? "},
+        {"isntall --traget eth0", 2, "There is no verb \"isntall\".\nDid you mean install? "},
         {"help jbos", 2, "There is no verb \"jbos\".\nDid you mean jobs? "},
         {"", 2, "No verb was given."},
         {"instances", 2, "CLASS is required."},
-        {"instances No_Such", 4, "served.\n\"quenxctl mof\" prints the classes"},
         {"instances Quenx_EthernetProt --names", 4, "is served.\nDid you mean Quenx_EthernetPort? "},
         {"jobs", 2, "Jobs are kept by a server, and none was named"},
         {"adapters --server 127.0.0.1:5989", 2, "Write it as https://host:5989."},
@@ -147,11 +138,9 @@ TEST_F(WrongUseTest, WritesOneJsonDocumentForErrorsToo) {
     } rows[] = {
         {"adapters", 0, "/adapters/0/name", "eth0"},
         {"instances Quenx_EthernetPort", 0, "/instances/0/class", "Quenx_EthernetPort"},
-        {"instances Quenx_EthernetPort --names", 0, "/paths/5", nullptr},
         {"identities", 0, "/identities/0/installable", false},
         {"instances No_Such", 4, "/exitStatus", 4},
         {"frobnicate", 2, "/error", "There is no verb \"frobnicate\"."},
-        {"install --target eth9 IMAGE", 4, "/error", "There is no adapter \"eth9\"."},
         {"check --target eth0 none.rom", 4, "/result", "refused"},
         {"check --target eth0 IMAGE", 0, "/result", "installable"},
         {"install --target eth3 IMAGE", 1, "/returnValue", 4097},

@@ -1,14 +1,19 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "CimXml/Request.h"
-
 #include <gtest/gtest.h>
 
+#include "CimXml/Request.h"
+#include "CimXml/Response.h"
 #include "CimXml/WireCheck.h"
 #include "CimXml/WireError.h"
 
 namespace {
 
+using cimxml::IntrinsicResult;
 using cimxml::Request;
+using cimxml::ResultKind;
+using core::CimPath;
+using core::CimType;
+using core::CimValue;
 
 template <class T>
 T held(const Request& request, std::string_view name) {
@@ -34,7 +39,7 @@ TEST(RequestReaderTest, ReadsWhatClientsSend) {
     const Request get = cimxml::readRequest(test::readSample("w-GetInstance.xml"));
     EXPECT_EQ(std::get<cimxml::IntrinsicCall>(get.call).namespaceName, "root/cimv2");
     EXPECT_EQ(held<std::string>(get, "LocalOnly"), "FALSE");
-    EXPECT_EQ(held<core::CimPath>(get, "InstanceName").toString(),
+    EXPECT_EQ(held<CimPath>(get, "InstanceName").toString(),
               "root/cimv2:Quenx_ConcreteJob.InstanceID=\"Quenx:FirmwareUpdate@Job#1\"");
     const Request walk = cimxml::readRequest(test::readSample("p-Associators.xml"));
     EXPECT_EQ(held<cimxml::ClassName>(walk, "AssocClass").name, "CIM_ElementCapabilities");
@@ -116,19 +121,20 @@ TEST(RequestReaderTest, NotesAnArgumentThatIsNotOfItsStatedType) {
         return std::get<cimxml::MethodCall>(request.call).mistypedArgument;
     };
     const std::string reference = "<VALUE.REFERENCE><CLASSNAME NAME='C'/></VALUE.REFERENCE>";
-    for (const std::string& good :
-         {std::string(">"), std::string("><VALUE>x</VALUE>"), ">" + reference,
-          "PARAMTYPE='reference'>" + reference,
-          std::string("PARAMTYPE='uint8'><VALUE.ARRAY><VALUE>5</VALUE></VALUE.ARRAY>")})
+    const std::string array = "<VALUE.ARRAY><VALUE>5</VALUE></VALUE.ARRAY>";
+    for (const std::string& good : {">" + reference, "PARAMTYPE='reference'>" + reference,
+                                    "PARAMTYPE='uint8'>" + array, std::string(">")})
         EXPECT_EQ(mistyped(good), "") << good;
     for (const std::string& bad :
-         {std::string("PARAMTYPE='uint8'><VALUE>256</VALUE>"), "PARAMTYPE='string'>" + reference,
-          std::string("PARAMTYPE='reference'><VALUE>C</VALUE>"),
+         {"PARAMTYPE='string'>" + reference, std::string("PARAMTYPE='reference'><VALUE>C</VALUE>"),
           std::string("><VALUE.ARRAY><VALUE>x</VALUE><VALUE.NULL/></VALUE.ARRAY>")})
         EXPECT_EQ(mistyped(bad), "P") << bad;
 }
 
-bool areAccepted(const cimxml::RequestHeaders& headers, const Request& request) {
+bool isAccepted(const Request& request, const char* object, const char* method = nullptr) {
+    cimxml::RequestHeaders headers;
+    headers.object = object;
+    if (method != nullptr) headers.method = method;
     try {
         cimxml::checkHeadersAgainst(headers, request);
         return true;
@@ -138,43 +144,93 @@ bool areAccepted(const cimxml::RequestHeaders& headers, const Request& request) 
     }
 }
 
-cimxml::RequestHeaders withObject(const char* object) {
-    cimxml::RequestHeaders headers;
-    headers.object = object;
-    return headers;
-}
-
-TEST(RequestHeadersTest, HaveToNameTheNamespaceOfAnOperation) {
-    const Request request{"1", cimxml::IntrinsicCall{"GetInstance", "root/cimv2", {}}};
-    for (const char* same :
-         {"root/cimv2", "root%2fcimv2", "Root%2FCIMv2", "/root/cimv2/", "//host:1/root/cimv2"})
-        EXPECT_TRUE(areAccepted(withObject(same), request)) << same;
+TEST(RequestHeadersTest, HaveToNameWhatIsCalled) {
+    const Request get{"1", cimxml::IntrinsicCall{"GetInstance", "root/cimv2", {}}};
+    for (const char* same : {"root/cimv2", "Root%2fCIMv2", "/root/cimv2/", "//host:1/root/cimv2"})
+        EXPECT_TRUE(isAccepted(get, same)) << same;
     for (const char* other : {"", "root", "root/cimv2/x", "root/cimv2:CIM_Service", "interop", "%"})
-        EXPECT_FALSE(areAccepted(withObject(other), request)) << other;
-}
+        EXPECT_FALSE(isAccepted(get, other)) << other;
 
-TEST(RequestHeadersTest, HaveToNameTheObjectOfAMethod) {
-    core::CimPath object("C_Job", {{"ID", std::string("a\"b\\c")}, {"Number", std::string("0x5")}});
+    CimPath object("C_Job", {{"ID", std::string("a\"b\\c")}, {"Number", std::string("0x5")}});
     object.setNamespace("root/cimv2");
-    const Request request{"1", cimxml::MethodCall{"Kill", object, {}}};
+    const Request kill{"1", cimxml::MethodCall{"Kill", object, {}}};
+    const char* const right = "root/cimv2:C_Job.ID=\"a\\\"b\\\\c\",Number=5";
     for (const char* same :
-         {"root/cimv2:C_Job.ID=\"a\\\"b\\\\c\",Number=5", "//h/root/cimv2:c_job.number=5,id=\"a\\\"b\\\\c\"",
+         {right, "//h/root/cimv2:c_job.number=5,id=\"a\\\"b\\\\c\"",
           "root%2Fcimv2%3AC_Job.ID=%22a%5C%22b%5C%5Cc%22,Number=5",
           "root/cimv2:C_Job.ID=\"a\"b\\c\",Number=0x5"}) {  // a client that escapes nothing
-        EXPECT_TRUE(areAccepted(withObject(same), request)) << same;
+        EXPECT_TRUE(isAccepted(kill, same)) << same;
     }
     for (const char* other :
          {"", "root/cimv2", "root/cimv2:C_Job", "root/interop:C_Job.ID=\"a\\\"b\\\\c\",Number=5",
           "root/cimv2:C_Other.ID=\"a\\\"b\\\\c\",Number=5", "root/cimv2:C_Job.ID=\"x\",Number=5",
           "root/cimv2:C_Job.ID=\"a\\\"b\\\\c\",Number=6", "root/cimv2:C_Job.ID=\"a\\\"b\\\\c\"",
           "root/cimv2:C_Other.ID=\"a\"b\""}) {
-        EXPECT_FALSE(areAccepted(withObject(other), request)) << other;
+        EXPECT_FALSE(isAccepted(kill, other)) << other;
     }
-    cimxml::RequestHeaders method;
-    method.method = "K%69LL";
-    EXPECT_TRUE(areAccepted(method, request));
-    method.method = "Start";
-    EXPECT_FALSE(areAccepted(method, request));
+    EXPECT_TRUE(isAccepted(kill, right, "K%69LL"));
+    EXPECT_FALSE(isAccepted(kill, right, "Start"));
+}
+
+/// An instance with the values whose texts are easily wrong.
+core::InstanceValue oddValues() {
+    const auto property = [](const char* name, CimValue value, const char* referenceClass = "") {
+        return core::PropertyValue{name, std::move(value), false, referenceClass};
+    };
+    return {CimPath("root/cimv2:T_Job.ID=\"J#1\",Number=7,Flag=TRUE"),
+            {property("Odd", CimValue::of(CimType::String, std::string("<&>\"' \xC3\xBC\x01"))),
+             property("Empty", CimValue::of(CimType::String, std::string())),
+             property("Null", CimValue::null(CimType::Uint8)),
+             property("Flag", CimValue::of(CimType::Boolean, true)),
+             property("Lasts", CimValue::of(CimType::Datetime, utils::Time(300000000ULL))),
+             property("Began", CimValue::of(CimType::Datetime, utils::Time(2024, 2, 29, 23, 59, 59))),
+             property("NoCodes", CimValue::arrayOf(CimType::Uint16, {})),
+             property("NullCodes", CimValue::null(CimType::String, true)),
+             property("NullOwner", CimValue::null(CimType::Reference), "T_Owner")}};
+}
+
+TEST(ResponseWriterTest, WritesTextsAsClientsExpectThem) {
+    IntrinsicResult result;
+    result.kind = ResultKind::Instance;
+    result.instances = {oddValues()};
+    auto origins = std::make_shared<cimxml::Origins>();
+    (*origins)["t_job"]["flag"] = "T_Root";
+    result.origins = origins;
+    const auto written = [](const IntrinsicResult& content) {
+        return cimxml::writeResponse({"4711", "Op", false, "host:5989", content});
+    };
+    const std::string message = written(result);
+    EXPECT_EQ(test::faultsOf(message), "");
+    for (const char* part :
+         {"<PROPERTY NAME=\"Flag\" TYPE=\"boolean\" CLASSORIGIN=\"T_Root\"><VALUE>TRUE</VALUE></PROPERTY>",
+          "<VALUE>&lt;&amp;&gt;&quot;' \xC3\xBC</VALUE>",
+          "<PROPERTY NAME=\"Empty\" TYPE=\"string\"><VALUE></VALUE></PROPERTY>",
+          "<PROPERTY NAME=\"Null\" TYPE=\"uint8\"></PROPERTY>", "<VALUE>00000000000500.000000:000</VALUE>",
+          "<VALUE>20240229235959.000000+000</VALUE>", "<VALUE.ARRAY></VALUE.ARRAY>",
+          "<PROPERTY.ARRAY NAME=\"NullCodes\" TYPE=\"string\"></PROPERTY.ARRAY>",
+          "<PROPERTY.REFERENCE NAME=\"NullOwner\" REFERENCECLASS=\"T_Owner\"></PROPERTY.REFERENCE>"}) {
+        EXPECT_NE(message.find(part), std::string::npos) << part << "\n" << message;
+    }
+    // A client tells an empty list from a missing one.
+    result.instances.clear();
+    EXPECT_NE(written(result).find("<IRETURNVALUE></IRETURNVALUE>"), std::string::npos);
+    EXPECT_EQ(written({}).find("IRETURNVALUE"), std::string::npos);
+}
+
+TEST(ResponseReaderTest, RefusesWhatIsNoResponse) {
+    const auto inside = [](const std::string& content) {
+        return "<CIM CIMVERSION='2.0' DTDVERSION='2.0'><MESSAGE ID='1' PROTOCOLVERSION='1.0'><SIMPLERSP>" +
+               content + "</SIMPLERSP></MESSAGE></CIM>";
+    };
+    for (const std::string& bad :
+         {std::string("<html/>"), inside("<IMETHODCALL NAME='X'/>"),
+          inside("<IMETHODRESPONSE NAME='X'><ERROR CODE='six'/></IMETHODRESPONSE>"),
+          inside("<IMETHODRESPONSE NAME='X'><IRETURNVALUE><NEW/></IRETURNVALUE></IMETHODRESPONSE>"),
+          inside("<METHODRESPONSE NAME='X'><RETURNVALUE><VALUE>x</VALUE></RETURNVALUE></METHODRESPONSE>"),
+          inside("<IMETHODRESPONSE NAME='X'><IRETURNVALUE><INSTANCE CLASSNAME='C'><PROPERTY NAME='P' "
+                 "TYPE='uint8'><VALUE>300</VALUE></PROPERTY></INSTANCE></IRETURNVALUE></IMETHODRESPONSE>")}) {
+        EXPECT_THROW(cimxml::readResponse(bad), cimxml::WireError) << bad;
+    }
 }
 
 }  // namespace

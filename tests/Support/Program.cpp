@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "System/Program.h"
+#include "Support/Program.h"
 
 #include <fcntl.h>
 #include <poll.h>
