@@ -34,7 +34,7 @@ int main(int argc, char** argv) {
         return 2;
     }
     test::effort = {true, std::chrono::seconds(seconds), jobs};
-    ::testing::AddGlobalTestEnvironment(new test::ChosenEnvironment);
+    const test::ChosenEnvironment environment;
     const int status = RUN_ALL_TESTS();
     std::printf("\n| figure | number |\n|---|---|\n");
     for (const auto& [name, number] : test::figures)

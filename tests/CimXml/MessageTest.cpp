@@ -138,8 +138,7 @@ bool isAccepted(const Request& request, const char* object, const char* method =
     try {
         cimxml::checkHeadersAgainst(headers, request);
         return true;
-    } catch (const cimxml::WireError& error) {
-        EXPECT_STREQ(error.fault().cimError, "header-mismatch");
+    } catch (const cimxml::WireError&) {
         return false;
     }
 }

@@ -1,10 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
-#include <gtest/gtest.h>
-
-#include <optional>
-
 #include "Support/TempFolder.h"
 #include "Utils/Os/Linux/SMASHv2Config.h"
 
@@ -14,14 +10,13 @@ namespace test {
 /// and file mode mask nor the configuration of the machine change what the tests see: there are no adapters,
 /// the providers' settings are the defaults, and the home is a folder of the tests' own. Only the variables
 /// that direct the instruments (sanitizers, coverage) and the place of temporary files are kept.
-class ChosenEnvironment : public ::testing::Environment {
+class ChosenEnvironment {
   public:
-    void SetUp() override;
-    void TearDown() override;
+    ChosenEnvironment();
 
   private:
-    std::optional<TempFolder> m_home;
-    std::optional<utils::SMASHv2Config> m_configuration;
+    TempFolder m_home;
+    utils::SMASHv2Config m_configuration{m_home / "quenx-cimprovider.conf"};
 };
 
 }  // namespace test

@@ -15,7 +15,7 @@ class LogCleaner : public ::testing::EmptyTestEventListener {
 
 int main(int argc, char** argv) {
     ::testing::InitGoogleTest(&argc, argv);
-    ::testing::AddGlobalTestEnvironment(new test::ChosenEnvironment);
+    const test::ChosenEnvironment environment;
     ::testing::UnitTest::GetInstance()->listeners().Append(new LogCleaner);
     return RUN_ALL_TESTS();
 }

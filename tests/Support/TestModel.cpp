@@ -79,8 +79,8 @@ Link::Link() {
 }
 
 Link::Link(const Gadget& from, const Gadget& to) : Link() {
-    From = &from;
-    To = &to;
+    From.assign(&from);
+    To.assign(&to);
 }
 
 int GadgetClass::DeleteInstance(core::CimPath& path) {

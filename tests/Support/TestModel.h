@@ -55,10 +55,7 @@ class Link : public core::CimInstance {
         Reference(const char* name, core::CimInstance* owner) : CimPropertyRef(name, owner) {
             setReferenceClass(Gadget::classInfo.name);
         }
-        Reference& operator=(const Gadget* target) {
-            assign(target);
-            return *this;
-        }
+        using CimPropertyRef::assign;
     };
     Reference From{"From", this};
     Reference To{"To", this};

@@ -115,45 +115,43 @@ TEST(DaemonTest, IsDiscoveredFromTheInteropNamespace) {
         EXPECT_FALSE(daemon.lines("gc", name).empty()) << name;
 }
 
-class StoppingTest : public ::testing::TestWithParam<bool> {};
+TEST(DaemonTest, LetsAFlashEndBeforeItStops) {
+    for (const bool isDeleted : {false, true}) {
+        // A socket stands in for the service manager.
+        const test::TempFolder folder;
+        const std::string path = folder / "notify";
+        sockaddr_un address{};
+        address.sun_family = AF_UNIX;
+        path.copy(address.sun_path, sizeof address.sun_path - 1);
+        const int manager = ::socket(AF_UNIX, SOCK_DGRAM | SOCK_CLOEXEC, 0);
+        ASSERT_EQ(::bind(manager, reinterpret_cast<const sockaddr*>(&address), sizeof address), 0);
 
-TEST_P(StoppingTest, LetsAFlashEndBeforeItStops) {
-    const bool isDeleted = GetParam();
-    // A socket stands in for the service manager.
-    const test::TempFolder folder;
-    const std::string path = folder / "notify";
-    sockaddr_un address{};
-    address.sun_family = AF_UNIX;
-    path.copy(address.sun_path, sizeof address.sun_path - 1);
-    const int manager = ::socket(AF_UNIX, SOCK_DGRAM | SOCK_CLOEXEC, 0);
-    ASSERT_EQ(::bind(manager, reinterpret_cast<const sockaddr*>(&address), sizeof address), 0);
+        RunningDaemon daemon({}, {"NOTIFY_SOCKET=" + path});
+        test::HeldFlash flash(daemon.folder() / "state/eth0");
+        const std::string job = startUpdate(daemon);
+        ASSERT_TRUE(reaches(daemon, job, "4"));
+        if (isDeleted) daemon.lines("di", job);
+        daemon.program().send(SIGTERM);
+        ASSERT_TRUE(
+            daemon.program().waitFor(isDeleted ? "Waiting for an update whose job was deleted."
+                                               : "Waiting for the update of Quenx:FirmwareUpdate@Job#1 at "));
+        daemon.program().send(SIGTERM);
+        EXPECT_TRUE(daemon.program().waitFor("Asked again to stop. Still waiting for "));
+        flash.release();
+        const ProgramResult result = daemon.program().finish();
+        EXPECT_EQ(result.status, 0) << result.out;
+        EXPECT_TRUE(contains(result.out, "Stopped.")) << result.out;
 
-    RunningDaemon daemon({}, {"NOTIFY_SOCKET=" + path});
-    test::HeldFlash flash(daemon.folder() / "state/eth0");
-    const std::string job = startUpdate(daemon);
-    ASSERT_TRUE(reaches(daemon, job, "4"));
-    if (isDeleted) daemon.lines("di", job);
-    daemon.program().send(SIGTERM);
-    ASSERT_TRUE(daemon.program().waitFor(isDeleted
-                                             ? "Waiting for an update whose job was deleted."
-                                             : "Waiting for the update of Quenx:FirmwareUpdate@Job#1 at "));
-    daemon.program().send(SIGTERM);
-    EXPECT_TRUE(daemon.program().waitFor("Asked again to stop. Still waiting for "));
-    flash.release();
-    const ProgramResult result = daemon.program().finish();
-    EXPECT_EQ(result.status, 0) << result.out;
-    EXPECT_TRUE(contains(result.out, "Stopped.")) << result.out;
-
-    std::string told;
-    char bytes[512];
-    for (ssize_t length = 0; (length = ::recv(manager, bytes, sizeof bytes, MSG_DONTWAIT)) > 0;)
-        told.append(bytes, static_cast<std::size_t>(length)).append("\n");
-    ::close(manager);
-    for (const char* part : {"READY=1", "STOPPING=1", "EXTEND_TIMEOUT_USEC=30000000", "STATUS=Waiting for"})
-        EXPECT_THAT(told, HasSubstr(part));
+        std::string told;
+        char bytes[512];
+        for (ssize_t length = 0; (length = ::recv(manager, bytes, sizeof bytes, MSG_DONTWAIT)) > 0;)
+            told.append(bytes, static_cast<std::size_t>(length)).append("\n");
+        ::close(manager);
+        for (const char* part :
+             {"READY=1", "STOPPING=1", "EXTEND_TIMEOUT_USEC=30000000", "STATUS=Waiting for"})
+            EXPECT_THAT(told, HasSubstr(part));
+    }
 }
-
-INSTANTIATE_TEST_SUITE_P(OfJobs, StoppingTest, ::testing::Bool());
 
 TEST(DaemonTest, ReadsUsersAndCertificateAgain) {
     RunningDaemon daemon;
