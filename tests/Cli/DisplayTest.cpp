@@ -6,7 +6,7 @@
 
 #include "Cli/Display/Output.h"
 #include "Cli/Display/Progress.h"
-#include "Cli/Update/Image.h"
+#include "Cli/Update/Candidate.h"
 
 namespace {
 

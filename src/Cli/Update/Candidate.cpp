@@ -1,13 +1,114 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Cli/Update/Candidate.h"
 
+#include <sys/stat.h>
+
 #include <algorithm>
+#include <cerrno>
+#include <filesystem>
+#include <system_error>
 
 #include "Cli/Connection/Properties.h"
+#include "Utils/Os/Linux/linux.h"
+#include "Utils/Utils.h"
 
 namespace cli {
 
 namespace {
+
+constexpr std::string_view kAuthority = "//";
+
+/// Beyond this the file is left to the service.
+constexpr std::uint64_t kLargestRead = std::uint64_t{256} << 20;
+
+bool isSchemeCharacter(char c) {
+    return utils::isLetter(c) || utils::isDigit(c) || c == '+' || c == '-' || c == '.';
+}
+
+Explanation notAnImage(const std::string& path, const std::string& why) {
+    return {path + " " + why + ".", "Name a complete firmware image."};
+}
+
+/// Empty for a file that can be an image.
+std::string kindProblem(const struct stat& info) {
+    constexpr std::uint64_t kLargestImage = 0x7FFFFFFF;
+    if (S_ISDIR(info.st_mode)) return "is a directory";
+    if (!S_ISREG(info.st_mode)) return "is not a regular file";
+    if (info.st_size == 0) return "is empty";
+    const auto bytes = static_cast<std::uint64_t>(info.st_size);
+    if (bytes > kLargestImage) return "is larger than 2 GiB";
+    return bytes > kLargestRead ? "is larger than any firmware image for a network adapter" : "";
+}
+
+std::string firstForeignIds(const ma::RomFile& rom, const std::string& adapterIds) {
+    for (const ma::RomImage& image : rom.images) {
+        const auto matches = [&](std::uint16_t device) {
+            return ma::formatIds(image.vendorId, device) == adapterIds;
+        };
+        if (!matches(image.deviceId) &&
+            std::none_of(image.furtherDeviceIds.begin(), image.furtherDeviceIds.end(), matches)) {
+            return ma::formatIds(image.vendorId, image.deviceId);
+        }
+    }
+    return {};
+}
+
+bool carries(const ma::RomImage& image, const std::string& type) {
+    const auto wanted = ma::firmwareTypeFromName(type);
+    return wanted && image.carries(*wanted);
+}
+
+/// Reads the file. Never waits: only a regular file is opened. Never throws on account of the file.
+ImageFile readImage(const std::string& path) try {
+    ImageFile image{path, std::nullopt, {}};
+    struct stat info = {};
+    if (stat(path.c_str(), &info) != 0) throw std::system_error(errno, std::generic_category());
+    // Checked before it is opened: opening a pipe would wait for somebody to write into it.
+    if (const std::string why = kindProblem(info); !why.empty()) {
+        image.problem = notAnImage(path, why);
+        return image;
+    }
+    // If the file has gone since stat(), nothing can be read.
+    const std::optional<std::vector<std::uint8_t>> content = os::readWholeFile(path, kLargestRead);
+    if (!content) throw std::system_error(ENOENT, std::generic_category());
+    image.rom = ma::parseOptionRom(*content);
+    if (image.rom.error)
+        image.problem = notAnImage(path, "is not a complete firmware image: " + *image.rom.error);
+    return image;
+} catch (const std::system_error& error) {
+    return {path, cannotRead(path, error.code().value()), {}};
+}
+
+/// @param types  those asked for; none means all
+Comparison compare(const ma::RomFile& rom, const Adapter& adapter, const std::vector<std::string>& types) {
+    Comparison result;
+    for (const utils::FirmwareVersionInfo& component : rom.components()) {
+        const std::string type(ma::firmwareTypeName(component.type));
+        const bool isChosen = types.empty() || std::find(types.begin(), types.end(), type) != types.end();
+        if (!type.empty() && isChosen) result.chosen.push_back({type, component.version});
+    }
+    for (const std::string& type : types) {
+        const bool isThere = std::any_of(rom.images.begin(), rom.images.end(),
+                                         [&](const ma::RomImage& image) { return carries(image, type); });
+        // "IMG_PXE+" asks for an empty type besides, which the service ignores, too.
+        if (!type.empty() && !isThere) result.missing.push_back(type);
+    }
+    for (const ma::RomImage& image : rom.images) {
+        const bool isChosen =
+            types.empty() || std::any_of(types.begin(), types.end(),
+                                         [&](const std::string& type) { return carries(image, type); });
+        // An image can carry two types, and is written whole for either.
+        if (isChosen) result.bytes += image.length;
+        result.isNetwork = result.isNetwork && image.isNetwork();
+    }
+    // An adapter that does not show its ids can be compared with nothing; the service knows them.
+    if (!adapter.ids.empty()) result.foreignIds = firstForeignIds(rom, adapter.ids);
+    result.current = !result.chosen.empty() &&
+                     std::all_of(result.chosen.begin(), result.chosen.end(), [&](const Component& component) {
+                         return versionOf(adapter.components, component.type) == component.version;
+                     });
+    return result;
+}
 
 /// Throws CommandError for a type that the service's capabilities do not name. If they name none, any type is
 /// taken.
@@ -36,6 +137,31 @@ Candidate compared(const Connection& connection, Candidate candidate) {
 
 }  // namespace
 
+std::string uriScheme(std::string_view uri) {
+    const auto colon = uri.find(':');
+    if (colon == std::string_view::npos || colon == 0 || !utils::isLetter(uri.front())) return {};
+    std::string scheme = utils::lowerCase(uri.substr(0, colon));
+    if (!std::all_of(scheme.begin(), scheme.end(), isSchemeCharacter)) return {};
+    return scheme;
+}
+
+std::string imageUri(const std::string& image) {
+    const std::string scheme = uriScheme(image);
+    // "file:" is a URI even when badly written; other colons without "//" are common in file names.
+    const bool isUri =
+        scheme == "file" || (!scheme.empty() && image.substr(scheme.size() + 1).starts_with(kAuthority));
+    if (isUri) return image;
+    return "file://" + std::filesystem::absolute(image).string();
+}
+
+std::optional<std::string> localPath(std::string_view uri) {
+    const std::string scheme = uriScheme(uri);
+    if (scheme != "file") return std::nullopt;
+    const std::string_view rest = uri.substr(scheme.size() + 1);
+    if (!rest.starts_with(kAuthority)) return std::nullopt;
+    return std::string(rest.substr(kAuthority.size()));
+}
+
 bool Candidate::isAlreadyCurrent() const {
     // An image for another card can have the same versions: the service is to refuse that one.
     return comparison && comparison->current && comparison->foreignIds.empty() && comparison->isNetwork &&
@@ -51,11 +177,8 @@ Candidate makeCandidate(const Connection& connection, const UpdateOptions& optio
     requireKnownTypes(*connection.operations, options.types);
     return compared(connection, {.adapter = std::move(adapter),
                                  .uri = imageUri(options.image),
-                                 .identity = {},
                                  .types = options.types,
-                                 .force = options.force,
-                                 .image = std::nullopt,
-                                 .comparison = std::nullopt});
+                                 .force = options.force});
 }
 
 Candidate makeCandidate(const Connection& connection, Adapter adapter, const InventoryItem& image,
@@ -64,9 +187,7 @@ Candidate makeCandidate(const Connection& connection, Adapter adapter, const Inv
                                  .uri = image.uri(),
                                  .identity = image.path,
                                  .types = image.types,
-                                 .force = force,
-                                 .image = std::nullopt,
-                                 .comparison = std::nullopt});
+                                 .force = force});
 }
 
 }  // namespace cli

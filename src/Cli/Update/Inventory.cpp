@@ -3,16 +3,40 @@
 
 #include <algorithm>
 #include <filesystem>
-#include <optional>
 
 #include "Cli/Connection/Properties.h"
-#include "Cli/Display/Messages.h"
 #include "Cli/Display/Output.h"
-#include "Cli/Update/Image.h"
+#include "Cli/Update/Candidate.h"
 
 namespace cli {
 
 namespace {
+
+/// The text that a port gives under a description, its identifying texts and their descriptions being
+/// parallel.
+std::string identifyingText(const core::InstanceValue& port, std::string_view description) {
+    const std::vector<std::string> texts = textsOf(port, "OtherIdentifyingInfo");
+    const std::vector<std::string> descriptions = textsOf(port, "IdentifyingDescriptions");
+    for (std::size_t i = 0; i < std::min(texts.size(), descriptions.size()); ++i) {
+        if (core::sameName(descriptions[i], description)) return texts[i];
+    }
+    return {};
+}
+
+/// Without the domain that "lspci -D" prints and the model leaves out.
+std::string_view withoutDomain(std::string_view pciAddress) {
+    constexpr std::string_view kFirstDomain = "0000:";
+    if (pciAddress.starts_with(kFirstDomain)) pciAddress.remove_prefix(kFirstDomain.size());
+    return pciAddress;
+}
+
+bool isMeant(const Adapter& adapter, const std::string& target) {
+    const std::string_view address = withoutDomain(adapter.pciAddress);
+    const core::CimPath path(target);
+    // An adapter without an address must not be meant by an empty one.
+    return adapter.name == target || (!address.empty() && core::sameName(address, withoutDomain(target))) ||
+           (path.isInstancePath() && adapter.path.isSameObjectAs(path));
+}
 
 constexpr const char* kAskInventory =
     "\"quenxctl identities\" lists the images. To add a file, put its directory into the line "
@@ -29,6 +53,75 @@ bool isSameFile(const std::string& uri, const std::string& other) {
 }
 
 }  // namespace
+
+void to_json(Json& json, const Component& component) {
+    json = {{"type", component.type}, {"version", component.version}};
+}
+
+std::optional<std::uint32_t> versionOf(const std::vector<Component>& components, std::string_view type) {
+    const auto found = std::find_if(components.begin(), components.end(),
+                                    [type](const Component& component) { return component.type == type; });
+    return found == components.end() ? std::nullopt : std::optional(found->version);
+}
+
+std::string componentsText(const std::vector<Component>& components) {
+    if (components.empty()) return "nothing";
+    std::vector<std::string> texts;
+    texts.reserve(components.size());
+    for (const Component& component : components)
+        texts.push_back(component.type + " " + std::to_string(component.version));
+    return joined(texts);
+}
+
+void to_json(Json& json, const Adapter& adapter) {
+    json = {{"name", adapter.name}, {"description", adapter.description}, {"pciAddress", adapter.pciAddress},
+            {"ids", adapter.ids},   {"updatable", adapter.updatable},     {"components", adapter.components},
+            {"path", adapter.path}};
+}
+
+std::vector<Component> readComponents(core::CimOperations& operations, const core::CimPath& port) {
+    const core::AssociationFilter installed = {"Quenx_ElementSoftwareIdentity", "Quenx_SoftwareIdentity", "",
+                                               ""};
+    std::vector<Component> components;
+    for (const core::InstanceValue& identity : operations.associators(port, installed)) {
+        const std::vector<std::string> types = textsOf(identity, "TargetTypes");
+        const auto version = static_cast<std::uint32_t>(numberOf(identity, "MajorVersion"));
+        // An installed identity is one component, so has one type, and the version is its major number.
+        if (!types.empty()) components.push_back({types.front(), version});
+    }
+    return components;
+}
+
+std::vector<Adapter> readAdapters(core::CimOperations& operations) {
+    std::vector<Adapter> adapters;
+    for (const core::InstanceValue& port : operations.enumerateInstances("Quenx_EthernetPort")) {
+        adapters.push_back({port.path, textOf(port, "Name"), textOf(port, "Description"),
+                            identifyingText(port, "PCI Address"),
+                            identifyingText(port, "PCI Vendor and Device ID"),
+                            !core::sameName(identifyingText(port, "Firmware Update"), "Not Supported"),
+                            readComponents(operations, port.path)});
+    }
+    return adapters;
+}
+
+std::string adviceForNoAdapters(const Connection& connection) {
+    if (!connection.isInProcess) return {};
+    return "Describe simulated ones in /etc/quenx-adapters.toml, or in a file that --adapters or "
+           "QUENX_ADAPTERS names.";
+}
+
+Adapter findAdapter(const Connection& connection, const std::string& target) {
+    std::vector<Adapter> adapters = readAdapters(*connection.operations);
+    if (adapters.empty())
+        throw CommandError(ExitStatus::NotFound, "There are no adapters.", adviceForNoAdapters(connection));
+    std::vector<std::string> names;
+    for (Adapter& adapter : adapters) {
+        if (isMeant(adapter, target)) return std::move(adapter);
+        names.push_back(adapter.name);
+    }
+    throw CommandError(ExitStatus::NotFound, "There is no adapter \"" + target + "\".",
+                       didYouMean(target, names) + "The adapters are " + joined(names) + ".");
+}
 
 void to_json(Json& json, const InventoryItem& item) {
     json = {{"id", item.id},       {"description", item.description},     {"version", item.version},

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "Cli/Update/Refusal.h"
+#include "Cli/Update/Service.h"
 
 #include <algorithm>
 #include <cerrno>

@@ -3,7 +3,6 @@
 #include <algorithm>
 
 #include "Cli/Display/Output.h"
-#include "Cli/Update/Refusal.h"
 #include "Cli/Update/Service.h"
 #include "Cli/Verbs/Verbs.h"
 
