@@ -43,8 +43,7 @@ std::vector<Qualifier> readQualifiers(const pugi::xml_node& element) {
 
 bool isSet(const std::vector<Qualifier>& qualifiers, std::string_view name) {
     const Qualifier* qualifier = core::findQualifier(qualifiers, name);
-    const core::CimScalar* value = qualifier == nullptr ? nullptr : qualifier->value.scalar();
-    const bool* flag = value == nullptr ? nullptr : std::get_if<bool>(value);
+    const bool* flag = qualifier == nullptr ? nullptr : qualifier->value.get<bool>();
     return flag != nullptr && *flag;
 }
 

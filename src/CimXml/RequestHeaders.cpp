@@ -2,11 +2,11 @@
 // The HTTP headers of a request, and whether they say what its body says. A firewall or proxy may decide by
 // the headers alone (DSP0200 6.2), so they must not claim another call than the one that is carried out.
 #include <algorithm>
-#include <charconv>
 
 #include "CimXml/ElementCodec.h"
 #include "CimXml/Request.h"
 #include "CimXml/WireError.h"
+#include "Utils/Utils.h"
 
 namespace cimxml {
 
@@ -16,17 +16,12 @@ namespace {
 /// The text with every %XX replaced by its byte; anything else stays.
 std::string percentDecoded(std::string_view text) {
     std::string decoded;
-    for (std::size_t i = 0; i < text.size(); ++i) {
-        unsigned int byte = 0;
-        if (text[i] == '%' && text.size() - i > 2) {
-            const char* end = text.data() + i + 3;
-            if (std::from_chars(text.data() + i + 1, end, byte, 16).ptr == end) {
-                decoded += static_cast<char>(byte);
-                i += 2;
-                continue;
-            }
-        }
-        decoded += text[i];
+    while (!text.empty()) {
+        std::optional<unsigned char> byte;
+        if (text.starts_with('%') && text.size() > 2)
+            byte = utils::parseNumber<unsigned char>(text.substr(1, 2), 16);
+        decoded += byte ? static_cast<char>(*byte) : text.front();
+        text.remove_prefix(byte ? 3 : 1);
     }
     return decoded;
 }
@@ -57,9 +52,8 @@ bool isSameKey(const core::CimScalar& header, const core::CimScalar& body) {
 
 bool isSameObject(const core::CimPath& header, const core::CimPath& body) {
     const auto isInBody = [&](const core::CimKey& key) {
-        return std::any_of(body.getKeys().begin(), body.getKeys().end(), [&](const core::CimKey& other) {
-            return core::sameName(key.name, other.name) && isSameKey(key.value, other.value);
-        });
+        const core::CimKey* other = core::findByName(body.getKeys(), key.name);
+        return other != nullptr && isSameKey(key.value, other->value);
     };
     return isSameNamespace(header.getNamespace(), body.getNamespace()) &&
            core::sameName(header.getClassName(), body.getClassName()) &&

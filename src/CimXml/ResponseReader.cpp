@@ -1,10 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
 #include <algorithm>
-#include <charconv>
 
 #include "CimXml/ElementCodec.h"
 #include "CimXml/Message.h"
 #include "CimXml/Response.h"
+#include "Utils/Utils.h"
 
 namespace cimxml {
 
@@ -46,11 +46,8 @@ core::InstanceValue readInstance(const pugi::xml_node& element) {
 
 /// An INSTANCE does not say which of its properties are keys; the path in front of it does.
 void markKeys(core::InstanceValue& instance) {
-    for (core::PropertyValue& property : instance.properties) {
-        for (const core::CimKey& key : instance.path.getKeys()) {
-            if (core::sameName(key.name, property.name)) property.isKey = true;
-        }
-    }
+    for (core::PropertyValue& property : instance.properties)
+        property.isKey = core::findByName(instance.path.getKeys(), property.name) != nullptr;
 }
 
 /// VALUE.NAMEDINSTANCE, VALUE.OBJECTWITHPATH, VALUE.INSTANCEWITHPATH.
@@ -105,10 +102,9 @@ core::Argument readOutput(const pugi::xml_node& element) {
 }
 
 std::uint32_t readNumber(const pugi::xml_node& element, const std::string& text) {
-    std::uint32_t number = 0;
-    const auto [end, error] = std::from_chars(text.data(), text.data() + text.size(), number);
-    if (error != std::errc() || end != text.data() + text.size()) refuseElement(element, "is no number");
-    return number;
+    const auto number = utils::parseNumber<std::uint32_t>(text);
+    if (!number) refuseElement(element, "is no number");
+    return *number;
 }
 
 ErrorResult readError(const pugi::xml_node& element) {

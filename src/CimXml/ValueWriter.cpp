@@ -10,12 +10,12 @@ namespace {
 
 using core::CimType;
 
-void writeContent(XmlWriter& writer, CimType type, const core::CimScalar& value) {
+void writeContent(XmlWriter& writer, const core::CimScalar& value) {
     // Most values are texts, and copying one only to escape it costs as much again.
     if (const auto* text = std::get_if<std::string>(&value)) {
         writer.text(*text);
     } else {
-        writer.text(core::scalarText(type, value));
+        writer.text(core::scalarText(value));
     }
 }
 
@@ -40,7 +40,7 @@ void writeKeyValue(XmlWriter& writer, const core::CimScalar& value) {
     writer.attribute("VALUETYPE", type == CimType::Boolean ? "boolean" : isNumber ? "numeric" : "string");
     if (!isNumber) writer.attribute("TYPE", core::typeName(type));
     writer.content();
-    writeContent(writer, type, value);
+    writeContent(writer, value);
     writer.end("KEYVALUE");
 }
 
@@ -49,10 +49,10 @@ void writeScalar(XmlWriter& writer, CimType type, const core::CimScalar& value) 
         writeReference(writer, *path);
     } else if (type == CimType::Reference) {
         // Held as the text that somebody typed.
-        writeReference(writer, core::CimPath(core::scalarText(type, value)));
+        writeReference(writer, core::CimPath(core::scalarText(value)));
     } else {
         writer.open("VALUE");
-        writeContent(writer, type, value);
+        writeContent(writer, value);
         writer.end("VALUE");
     }
 }

@@ -1,7 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 #include <algorithm>
 #include <array>
-#include <charconv>
 #include <cstdint>
 #include <string>
 #include <vector>
@@ -209,10 +208,8 @@ class Scanner {
         if (!name.starts_with('#')) return false;
         const bool isHexadecimal = name.starts_with("#x");
         name.remove_prefix(isHexadecimal ? 2 : 1);
-        std::uint32_t character = 0;
-        const char* end = name.data() + name.size();
-        const auto result = std::from_chars(name.data(), end, character, isHexadecimal ? 16 : 10);
-        return result.ec == std::errc() && result.ptr == end && isXmlCharacter(character);
+        const auto character = utils::parseNumber<std::uint32_t>(name, isHexadecimal ? 16 : 10);
+        return character && isXmlCharacter(*character);
     }
 
     std::string_view m_rest;

@@ -2,7 +2,6 @@
 #include "Utils/Utils.h"
 
 #include <algorithm>
-#include <charconv>
 #include <cstdarg>
 #include <cstdio>
 #include <ctime>
@@ -62,12 +61,10 @@ bool toUint(std::string_view text, std::uint32_t& value) {
     if (isHex) text.remove_prefix(2);
     // Without its prefix a number consists of digits only, so it prints back the same unless it is a decimal
     // one that has leading zeros or does not fit a signed int.
-    std::uint32_t number = 0;
-    const char* const end = text.data() + text.size();
-    const auto [rest, error] = std::from_chars(text.data(), end, number, isHex ? 16 : 10);
-    if (error != std::errc() || rest != end) return false;
-    if (!isHex && (number > INT32_MAX || (text.size() > 1 && text[0] == '0'))) return false;
-    value = number;
+    const auto number = parseNumber<std::uint32_t>(text, isHex ? 16 : 10);
+    if (!number) return false;
+    if (!isHex && (*number > INT32_MAX || (text.size() > 1 && text[0] == '0'))) return false;
+    value = *number;
     return true;
 }
 
@@ -76,6 +73,15 @@ std::string lowerCase(std::string_view text) {
     for (char& c : folded)
         c = lowerCase(c);
     return folded;
+}
+
+std::string joined(const StringArray& texts, std::string_view separator) {
+    std::string result;
+    for (const std::string& text : texts) {
+        if (&text != &texts.front()) result += separator;
+        result += text;
+    }
+    return result;
 }
 
 std::string hexByte(unsigned char byte) {

@@ -2,8 +2,10 @@
 #pragma once
 
 #include <algorithm>
+#include <charconv>
 #include <cstdarg>
 #include <cstdint>
+#include <optional>
 #include <string>
 #include <string_view>
 
@@ -36,6 +38,16 @@ QUENX_EXPORT std::string_view trimOf(std::string_view text, std::string_view cha
 /// leading zeros of a decimal number, anything after it. False, and `value` untouched, when refused.
 QUENX_EXPORT bool toUint(std::string_view text, std::uint32_t& value);
 
+/// Reads the whole text as a number, the way std::from_chars() does: no blanks, no prefix, and a sign only for
+/// a T that has one. Nothing for any other text, or one that T cannot hold.
+template <class T, class... Format>
+std::optional<T> parseNumber(std::string_view text, Format... format) {
+    T number{};
+    const char* const end = text.data() + text.size();
+    const auto [rest, error] = std::from_chars(text.data(), end, number, format...);
+    return error == std::errc() && rest == end ? std::optional<T>(number) : std::nullopt;
+}
+
 /// Folds the letters of ASCII to one case, and no others: names of the protocols and of CIM are compared so
 /// in every locale.
 constexpr char lowerCase(char c) {
@@ -59,6 +71,9 @@ constexpr bool isDigit(char c) {
 constexpr bool isControl(char c) {
     return static_cast<unsigned char>(c) < 0x20 || c == 0x7F;
 }
+
+/// The texts in one, with the separator between them.
+QUENX_EXPORT std::string joined(const StringArray& texts, std::string_view separator = ", ");
 
 /// The byte as two hexadecimal digits in lower case.
 QUENX_EXPORT std::string hexByte(unsigned char byte);

@@ -84,7 +84,7 @@ class DispatcherTest : public ::testing::Test {
     template <class Result>
     static std::string output(const Result& result, const std::string& name) {
         for (const core::Argument& each : result.outputs) {
-            if (each.name == name) return core::scalarText(each.value.type, *each.value.scalar());
+            if (each.name == name) return core::scalarText(*each.value.scalar());
         }
         return "none";
     }

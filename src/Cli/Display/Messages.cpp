@@ -5,8 +5,6 @@
 #include <cerrno>
 #include <system_error>
 
-#include "Utils/Utils.h"
-
 namespace cli {
 
 namespace {
@@ -67,15 +65,6 @@ std::string didYouMean(std::string_view word, const std::vector<std::string>& kn
         nearest = steps;
     }
     return found == nullptr ? std::string() : "Did you mean " + *found + "? ";
-}
-
-std::string joined(const std::vector<std::string>& words, std::string_view separator) {
-    std::string text;
-    for (const std::string& word : words) {
-        if (&word != &words.front()) text += separator;
-        text += word;
-    }
-    return text;
 }
 
 }  // namespace cli

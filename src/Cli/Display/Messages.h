@@ -7,7 +7,11 @@
 #include <utility>
 #include <vector>
 
+#include "Utils/Utils.h"
+
 namespace cli {
+
+using utils::joined;
 
 /// What the program tells the script that called it; the help text documents them.
 enum class ExitStatus {
@@ -47,8 +51,5 @@ Explanation cannotRead(const std::string& file, int error);
 /// "Did you mean eth0? " for a misspelt word: the one known word that it is nearest to, with a space for what
 /// follows. Empty when none is near, or when several are equally near.
 std::string didYouMean(std::string_view word, const std::vector<std::string>& known);
-
-/// "eth0, eth1, eth2"
-std::string joined(const std::vector<std::string>& words, std::string_view separator = ", ");
 
 }  // namespace cli

@@ -20,7 +20,7 @@ struct ScalarToJson {
 };
 
 std::string displayScalar(core::CimType type, const core::CimScalar& value) {
-    const std::string text = core::scalarText(type, value);
+    const std::string text = core::scalarText(value);
     const bool isText = type == core::CimType::String || type == core::CimType::Char16;
     return printable(isText ? utils::quoted(text) : text);
 }

@@ -8,7 +8,6 @@
 #include <filesystem>
 #include <system_error>
 
-#include "Cli/Connection/Properties.h"
 #include "Utils/Os/Linux/linux.h"
 #include "Utils/Utils.h"
 
@@ -115,7 +114,7 @@ Comparison compare(const ma::RomFile& rom, const Adapter& adapter, const std::ve
 void requireKnownTypes(core::CimOperations& operations, const std::vector<std::string>& types) {
     const auto capabilities = operations.enumerateInstances("Quenx_SoftwareInstallationServiceCapabilities");
     if (capabilities.empty()) return;
-    const std::vector<std::string> known = textsOf(capabilities.front(), "SupportedTargetTypes");
+    const std::vector<std::string> known = capabilities.front().texts("SupportedTargetTypes");
     if (known.empty()) return;
     // The service would answer with the code that every bad argument gets.
     for (const std::string& type : types) {

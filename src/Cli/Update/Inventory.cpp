@@ -4,7 +4,6 @@
 #include <algorithm>
 #include <filesystem>
 
-#include "Cli/Connection/Properties.h"
 #include "Cli/Display/Output.h"
 #include "Cli/Update/Candidate.h"
 
@@ -15,8 +14,8 @@ namespace {
 /// The text that a port gives under a description, its identifying texts and their descriptions being
 /// parallel.
 std::string identifyingText(const core::InstanceValue& port, std::string_view description) {
-    const std::vector<std::string> texts = textsOf(port, "OtherIdentifyingInfo");
-    const std::vector<std::string> descriptions = textsOf(port, "IdentifyingDescriptions");
+    const std::vector<std::string> texts = port.texts("OtherIdentifyingInfo");
+    const std::vector<std::string> descriptions = port.texts("IdentifyingDescriptions");
     for (std::size_t i = 0; i < std::min(texts.size(), descriptions.size()); ++i) {
         if (core::sameName(descriptions[i], description)) return texts[i];
     }
@@ -84,8 +83,8 @@ std::vector<Component> readComponents(core::CimOperations& operations, const cor
                                                ""};
     std::vector<Component> components;
     for (const core::InstanceValue& identity : operations.associators(port, installed)) {
-        const std::vector<std::string> types = textsOf(identity, "TargetTypes");
-        const auto version = static_cast<std::uint32_t>(numberOf(identity, "MajorVersion"));
+        const std::vector<std::string> types = identity.texts("TargetTypes");
+        const auto version = static_cast<std::uint32_t>(identity.number("MajorVersion"));
         // An installed identity is one component, so has one type, and the version is its major number.
         if (!types.empty()) components.push_back({types.front(), version});
     }
@@ -95,7 +94,7 @@ std::vector<Component> readComponents(core::CimOperations& operations, const cor
 std::vector<Adapter> readAdapters(core::CimOperations& operations) {
     std::vector<Adapter> adapters;
     for (const core::InstanceValue& port : operations.enumerateInstances("Quenx_EthernetPort")) {
-        adapters.push_back({port.path, textOf(port, "Name"), textOf(port, "Description"),
+        adapters.push_back({port.path, port.text("Name"), port.text("Description"),
                             identifyingText(port, "PCI Address"),
                             identifyingText(port, "PCI Vendor and Device ID"),
                             !core::sameName(identifyingText(port, "Firmware Update"), "Not Supported"),
@@ -133,17 +132,17 @@ std::vector<InventoryItem> readInventory(core::CimOperations& operations) {
     std::vector<InventoryItem> items;
     for (const core::InstanceValue& identity : operations.enumerateInstances("Quenx_SoftwareIdentity")) {
         items.push_back({identity.path,
-                         textOf(identity, "InstanceID"),
-                         textOf(identity, "Description"),
-                         textOf(identity, "VersionString"),
-                         textsOf(identity, "TargetTypes"),
+                         identity.text("InstanceID"),
+                         identity.text("Description"),
+                         identity.text("VersionString"),
+                         identity.texts("TargetTypes"),
                          {}});
     }
     for (const auto& resource : operations.enumerateInstances("Quenx_SoftwareIdentityResource")) {
         // A resource is named after the identity whose file it is, and its path.
-        const std::string id = textOf(resource, "InstanceID");
+        const std::string id = resource.text("InstanceID");
         for (InventoryItem& item : items) {
-            if (id.starts_with(item.id + "@")) item.uris.push_back(textOf(resource, "AccessInfo"));
+            if (id.starts_with(item.id + "@")) item.uris.push_back(resource.text("AccessInfo"));
         }
     }
     return items;

@@ -4,7 +4,6 @@
 #include <algorithm>
 #include <array>
 
-#include "Cli/Connection/Properties.h"
 #include "Cli/Display/Messages.h"
 #include "Cli/Display/Output.h"
 
@@ -14,10 +13,8 @@ namespace {
 
 /// The path that an association has at one of its ends; null when there is none.
 const core::CimPath* endOf(const core::CimPath& association, std::string_view role) {
-    for (const core::CimKey& key : association.getKeys()) {
-        if (core::sameName(key.name, role)) return std::get_if<core::CimPath>(&key.value);
-    }
-    return nullptr;
+    const core::CimKey* key = core::findByName(association.getKeys(), role);
+    return key == nullptr ? nullptr : std::get_if<core::CimPath>(&key->value);
 }
 
 /// A job does not tell its adapter; an association does.
@@ -33,20 +30,20 @@ void nameAdapters(core::CimOperations& operations, std::vector<JobView>& jobs) {
         const auto job = std::find_if(jobs.begin(), jobs.end(),
                                       [&](const auto& each) { return each.path.isSameObjectAs(*affecting); });
         // A job affects the card of its port, too; only the port is an adapter.
-        if (port != ports.end() && job != jobs.end()) job->adapter = textOf(*port, "Name");
+        if (port != ports.end() && job != jobs.end()) job->adapter = port->text("Name");
     }
 }
 
 JobView viewOf(const core::InstanceValue& job) {
     return {job.path,
-            textOf(job, "InstanceID"),
+            job.text("InstanceID"),
             "",
-            valueOf<utils::Time>(job, "StartTime"),
-            textOf(job, "Owner"),
-            static_cast<std::uint16_t>(numberOf(job, "JobState")),
-            static_cast<unsigned>(numberOf(job, "PercentComplete")),
-            static_cast<std::uint16_t>(numberOf(job, "ErrorCode")),
-            textOf(job, "ErrorDescription")};
+            job.get<utils::Time>("StartTime"),
+            job.text("Owner"),
+            static_cast<std::uint16_t>(job.number("JobState")),
+            static_cast<unsigned>(job.number("PercentComplete")),
+            static_cast<std::uint16_t>(job.number("ErrorCode")),
+            job.text("ErrorDescription")};
 }
 
 JobView lookAt(core::CimOperations& operations, const core::CimPath& job, const Following& following) {

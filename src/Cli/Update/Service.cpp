@@ -69,12 +69,10 @@ core::MethodResult startUpdate(core::CimOperations& operations, const Candidate&
 }
 
 core::CimPath jobOf(const core::MethodResult& result) {
-    for (const core::Argument& output : result.outputs) {
-        const core::CimScalar* value = output.value.scalar();
-        // A server may give further outputs, and references among them.
-        const auto* path = value == nullptr ? nullptr : std::get_if<core::CimPath>(value);
-        if (path != nullptr && core::sameName(output.name, "Job")) return *path;
-    }
+    // A server may give further outputs, and references among them.
+    const core::Argument* job = core::findByName(result.outputs, "Job");
+    const auto* path = job == nullptr ? nullptr : job->value.get<core::CimPath>();
+    if (path != nullptr) return *path;
     throw CommandError(ExitStatus::Unknown, "The service started an update but did not name its job.",
                        "\"quenxctl jobs\" lists the jobs of a server.");
 }

@@ -10,17 +10,17 @@ namespace cli {
 
 namespace {
 
-std::string literal(core::CimType type, const core::CimScalar& value) {
+std::string literal(const core::CimScalar& value) {
     const auto* text = std::get_if<std::string>(&value);
-    return text != nullptr ? utils::quoted(*text) : core::foldName(core::scalarText(type, value));
+    return text != nullptr ? utils::quoted(*text) : core::foldName(core::scalarText(value));
 }
 
 std::string literal(const core::CimValue& value) {
-    if (const core::CimScalar* scalar = value.scalar()) return literal(value.type, *scalar);
+    if (const core::CimScalar* scalar = value.scalar()) return literal(*scalar);
     if (value.elements() == nullptr) return "null";
     std::vector<std::string> items;
     for (const core::CimScalar& element : *value.elements())
-        items.push_back(literal(value.type, element));
+        items.push_back(literal(element));
     return "{ " + joined(items, ", ") + " }";
 }
 

@@ -3,7 +3,6 @@
 
 #include <stdexcept>
 #include <string>
-#include <utility>
 
 #include "Utils/Export.h"
 
@@ -47,15 +46,5 @@ class QUENX_EXPORT CimError : public std::runtime_error {
 /// For a catch clause: throws what is being handled as CimError. What is none becomes CimStatus::Failed, with
 /// the provider's own text; but the lack of memory passes, since there may be none to build an answer in.
 [[noreturn]] QUENX_EXPORT void rethrowAsCimError();
-
-/// Runs the body of a request, so that it fails with CimError only.
-template <class Body>
-auto withCimErrors(Body&& body) {
-    try {
-        return std::forward<Body>(body)();
-    } catch (...) {
-        rethrowAsCimError();
-    }
-}
 
 }  // namespace core

@@ -21,7 +21,7 @@ bool isName(std::string_view text) {
 }
 
 std::string keyText(const CimScalar& value) {
-    const std::string text = scalarText(CimType::String, value);
+    const std::string text = scalarText(value);
     const bool isQuoted = std::holds_alternative<std::string>(value) ||
                           std::holds_alternative<CimPath>(value) ||
                           std::holds_alternative<utils::Time>(value);

@@ -102,12 +102,12 @@ CimProperty::~CimProperty() {
 
 std::string CimProperty::toString() {
     const CimValue value = getValue();
-    if (const CimScalar* scalar = value.scalar()) return scalarText(value.type, *scalar);
+    if (const CimScalar* scalar = value.scalar()) return scalarText(*scalar);
     std::string text;
     if (const auto* elements = value.elements()) {
         for (const CimScalar& element : *elements) {
             if (!text.empty()) text += ',';
-            text += scalarText(value.type, element);
+            text += scalarText(element);
         }
     }
     return text;

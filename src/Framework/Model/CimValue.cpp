@@ -44,17 +44,14 @@ std::optional<CimScalar> parseInteger(CimType type, std::string_view text) {
         text = digits.substr(2);
         base = 16;
     }
-    T value{};
-    const auto [end, error] = std::from_chars(text.data(), text.data() + text.size(), value, base);
-    if (error != std::errc() || end != text.data() + text.size() || !fits(type, value)) return std::nullopt;
-    return CimScalar(value);
+    const auto value = utils::parseNumber<T>(text, base);
+    if (!value || !fits(type, *value)) return std::nullopt;
+    return CimScalar(*value);
 }
 
 std::optional<CimScalar> parseReal(std::string_view text) {
-    double value = 0;
-    const auto [end, error] = std::from_chars(text.data(), text.data() + text.size(), value);
-    if (error != std::errc() || end != text.data() + text.size()) return std::nullopt;
-    return CimScalar(value);
+    const auto value = utils::parseNumber<double>(text);
+    return value ? std::optional<CimScalar>(*value) : std::nullopt;
 }
 
 std::optional<CimScalar> parseBoolean(std::string_view text) {
@@ -115,11 +112,9 @@ std::optional<CimScalar> convertInteger(CimType type, const CimScalar& value) {
 
 /// The digits at a place of the text as a number; nothing when one is no digit.
 std::optional<int> digits(std::string_view text, std::size_t place, std::size_t count) {
-    const std::string_view field = text.substr(place, count);
-    if (!std::all_of(field.begin(), field.end(), utils::isDigit)) return std::nullopt;
-    int value = 0;
-    std::from_chars(field.data(), field.data() + field.size(), value);
-    return value;
+    // Unsigned, so that no sign passes for a digit.
+    const auto value = utils::parseNumber<unsigned int>(text.substr(place, count));
+    return value ? std::optional(static_cast<int>(*value)) : std::nullopt;
 }
 
 std::optional<utils::Time> parseInterval(std::string_view text, std::chrono::microseconds timeOfDay) {
@@ -149,24 +144,11 @@ std::optional<utils::Time> parseTimestamp(std::string_view text, std::chrono::mi
 
 }  // namespace
 
-CimValue CimValue::null(CimType type, bool isArray) {
-    return {type, isArray, {}};
-}
-
-CimValue CimValue::of(CimType type, CimScalar value) {
-    return {type, false, std::move(value)};
-}
-
-CimValue CimValue::arrayOf(CimType type, std::vector<CimScalar> values) {
-    return {type, true, std::move(values)};
-}
-
 bool sameValue(const CimScalar& left, const CimScalar& right) {
     return std::visit(SameValue{}, left, right);
 }
 
-std::string scalarText(CimType type, const CimScalar& value) {
-    static_cast<void>(type);
+std::string scalarText(const CimScalar& value) {
     struct Writer {
         std::string operator()(bool flag) const { return flag ? "TRUE" : "FALSE"; }
         std::string operator()(std::uint64_t number) const { return std::to_string(number); }

@@ -5,6 +5,7 @@
 #include <optional>
 #include <string>
 #include <string_view>
+#include <utility>
 #include <variant>
 #include <vector>
 
@@ -94,20 +95,27 @@ struct QUENX_EXPORT CimValue {
     bool isArray = false;
     std::variant<std::monostate, CimScalar, std::vector<CimScalar>> data;
 
-    static CimValue null(CimType type, bool isArray = false);
-    static CimValue of(CimType type, CimScalar value);
-    static CimValue arrayOf(CimType type, std::vector<CimScalar> values);
+    static CimValue null(CimType type, bool isArray = false) { return {type, isArray, {}}; }
+    static CimValue of(CimType type, CimScalar value) { return {type, false, std::move(value)}; }
+    static CimValue arrayOf(CimType type, std::vector<CimScalar> values) {
+        return {type, true, std::move(values)};
+    }
 
     bool isNull() const { return data.index() == 0; }
     /// The single value; null pointer when null or an array.
     const CimScalar* scalar() const { return std::get_if<CimScalar>(&data); }
+    /// The same; null pointer also when it is not a T.
+    template <class T>
+    const T* get() const {
+        return scalar() == nullptr ? nullptr : std::get_if<T>(scalar());
+    }
     /// The elements; null pointer when null or no array.
     const std::vector<CimScalar>* elements() const { return std::get_if<std::vector<CimScalar>>(&data); }
 };
 
-/// The value in the type's CIM text form: integers in decimal, booleans TRUE and FALSE, datetimes in 25
-/// characters, references as object paths, strings as they are (not quoted).
-QUENX_EXPORT std::string scalarText(CimType type, const CimScalar& value);
+/// The value in its CIM text form: integers in decimal, booleans TRUE and FALSE, datetimes in 25 characters,
+/// references as object paths, strings as they are (not quoted).
+QUENX_EXPORT std::string scalarText(const CimScalar& value);
 
 /// Reads a text as a value of the type. Integers in decimal or 0x..., within the range of the type; booleans
 /// in any case; blanks around numbers and booleans are ignored. Nothing for any other text.

@@ -181,21 +181,16 @@ void addSuperclasses(ClassChain& chain, const DeclarationsByName& byName) {
     }
 }
 
-/// Declarations by name, so that nothing points into a library that has unloaded.
-class DeclarationCache {
-  public:
-    std::shared_ptr<const ClassDeclaration> find(const CimClassInfo& info) {
-        const utils::Mutex::AutoLocker lock(m_mutex);
-        // Held while the sample is built, whose constructors need no declaration.
-        auto& declaration = m_declarations[info.name];
-        if (declaration == nullptr) declaration = read(info);
-        return declaration;
-    }
-
-  private:
-    utils::Mutex m_mutex;
-    std::map<std::string, std::shared_ptr<const ClassDeclaration>> m_declarations QUENX_GUARDED_BY(m_mutex);
-};
+/// Reads each class once, and remembers it by name, so that nothing points into a library that has unloaded.
+std::shared_ptr<const ClassDeclaration> declarationOf(const CimClassInfo& info) {
+    static utils::Mutex mutex;
+    static DeclarationsByName known;
+    const utils::Mutex::AutoLocker lock(mutex);
+    // Held while the sample is built, whose constructors need no declaration.
+    auto& declaration = known[info.name];
+    if (declaration == nullptr) declaration = read(info);
+    return declaration;
+}
 
 }  // namespace
 
@@ -229,11 +224,9 @@ std::vector<Qualifier> mergeQualifiers(std::vector<Qualifier> own, const std::ve
 }
 
 ClassChain declarationsOf(const CimClassInfo& info) {
-    static DeclarationCache cache;
     ClassChain chain;
-    for (const CimClassInfo* level = &info; level != nullptr; level = level->superclass) {
-        chain.push_back(cache.find(*level));
-    }
+    for (const CimClassInfo* level = &info; level != nullptr; level = level->superclass)
+        chain.push_back(declarationOf(*level));
     return chain;
 }
 

@@ -86,33 +86,19 @@ CimPath typedReference(const CimPath& path, const ClassLookup& classes) {
     }
 }
 
-/// What a client may mix up within, such as the widths of integers.
-enum class Kind { Boolean, Text, Integer, Real, Datetime, Reference };
-
-Kind kindOf(CimType type) {
-    switch (type) {
-        case CimType::Boolean:
-            return Kind::Boolean;
-        case CimType::String:
-        case CimType::Char16:
-            return Kind::Text;
-        case CimType::Datetime:
-            return Kind::Datetime;
-        case CimType::Reference:
-            return Kind::Reference;
-        case CimType::Real32:
-        case CimType::Real64:
-            return Kind::Real;
-        default:
-            return Kind::Integer;
-    }
+/// What a client may mix up, such as the widths of integers.
+bool isSameKind(CimType left, CimType right) {
+    const auto isInteger = [](CimType type) { return isUnsigned(type) || isSigned(type); };
+    const auto isText = [](CimType type) { return type == CimType::String || type == CimType::Char16; };
+    return left == right || (isInteger(left) && isInteger(right)) || (isReal(left) && isReal(right)) ||
+           (isText(left) && isText(right));
 }
 
 /// A path written as a text would be guessed at, so a reference is never read from one.
 std::optional<CimScalar> typedElement(CimType type, const CimScalar& value, const Argument& given) {
     const auto* text = given.isUntyped ? std::get_if<std::string>(&value) : nullptr;
     if (text != nullptr && type != CimType::Reference) return parseScalar(type, *text);
-    return kindOf(type) == kindOf(given.value.type) ? convertScalar(type, value) : std::nullopt;
+    return isSameKind(type, given.value.type) ? convertScalar(type, value) : std::nullopt;
 }
 
 /// The value as the declaration wants it; nothing where it is of another kind, or does not fit.
@@ -139,6 +125,16 @@ CimOperations::~CimOperations() = default;
 
 const PropertyValue* InstanceValue::find(std::string_view name) const {
     return findByName(properties, name);
+}
+
+std::vector<std::string> InstanceValue::texts(std::string_view name) const {
+    const PropertyValue* property = find(name);
+    std::vector<std::string> texts;
+    if (property == nullptr || property->value.elements() == nullptr) return texts;
+    for (const CimScalar& element : *property->value.elements()) {
+        if (const auto* text = std::get_if<std::string>(&element)) texts.push_back(*text);
+    }
+    return texts;
 }
 
 bool isWanted(const PropertyFilter& filter, std::string_view name) {

@@ -30,6 +30,19 @@ struct QUENX_EXPORT InstanceValue {
 
     /// The property of that name, without regard to case; null when it is not there.
     const PropertyValue* find(std::string_view name) const;
+
+    /// Its value; nothing for a property that is null, absent or of another type.
+    template <class T>
+    std::optional<T> get(std::string_view name) const {
+        const PropertyValue* property = find(name);
+        const T* value = property == nullptr ? nullptr : property->value.get<T>();
+        return value == nullptr ? std::nullopt : std::optional<T>(*value);
+    }
+    /// The same; empty, or 0, where get() gives nothing.
+    std::string text(std::string_view name) const { return get<std::string>(name).value_or(""); }
+    std::uint64_t number(std::string_view name) const { return get<std::uint64_t>(name).value_or(0); }
+    /// The elements of an array of strings; none where the property is anything else.
+    std::vector<std::string> texts(std::string_view name) const;
 };
 
 /// Which properties an answer holds: all without a list, else those named (names that no class has are

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
-#include <string>
+#include <string_view>
 #include <vector>
 
 #include "Framework/Classes/CimBroker.h"
@@ -51,7 +51,11 @@ auto answerRequest(Body&& body) {
     // Declared first: it keeps the provider's library, and with it the type of what it throws, loaded until
     // the exception is converted.
     const ServedClasses classes;
-    return withCimErrors([&] { return body(classes); });
+    try {
+        return body(classes);
+    } catch (...) {
+        rethrowAsCimError();
+    }
 }
 
 }  // namespace core

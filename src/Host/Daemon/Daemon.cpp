@@ -21,24 +21,16 @@ namespace host {
 
 namespace {
 
-template <class T>
-T valueOf(const core::InstanceValue& instance, std::string_view name) {
-    const core::PropertyValue* property = instance.find(name);
-    const core::CimScalar* scalar = property == nullptr ? nullptr : property->value.scalar();
-    const T* value = scalar == nullptr ? nullptr : std::get_if<T>(scalar);
-    return value == nullptr ? T() : *value;
-}
-
 /// The updates that the providers are working on: "Job#1 at 42 %, Job#2 at 7 %"; empty when there are none.
 std::string runningUpdates(core::CimOperations& operations) {
     std::string text;
     try {
         // By the standard's class, so that jobs of any provider count.
         for (const core::InstanceValue& job : operations.enumerateInstances("CIM_ConcreteJob")) {
-            const auto state = valueOf<std::uint64_t>(job, "JobState");
+            const auto state = job.number("JobState");
             if (state != JobStateStarting && state != JobStateRunning) continue;
-            text += (text.empty() ? "" : ", ") + valueOf<std::string>(job, "InstanceID") + " at " +
-                    std::to_string(valueOf<std::uint64_t>(job, "PercentComplete")) + " %";
+            text += (text.empty() ? "" : ", ") + job.text("InstanceID") + " at " +
+                    std::to_string(job.number("PercentComplete")) + " %";
         }
     } catch (const core::CimError&) {
         // No provider here serves jobs.

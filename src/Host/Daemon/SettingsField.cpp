@@ -2,8 +2,9 @@
 #include "Host/Daemon/SettingsField.h"
 
 #include <algorithm>
-#include <charconv>
 #include <stdexcept>
+
+#include "Utils/Utils.h"
 
 namespace host {
 
@@ -25,14 +26,12 @@ Overloaded(Cases...) -> Overloaded<Cases...>;
 }
 
 std::uint64_t numberIn(const SettingsField& field, const std::string& text) {
-    std::uint64_t number = 0;
-    const char* end = text.data() + text.size();
-    const auto result = std::from_chars(text.data(), end, number);
-    if (result.ec != std::errc() || result.ptr != end || number < field.least || number > field.most) {
+    const auto number = utils::parseNumber<std::uint64_t>(text);
+    if (!number || *number < field.least || *number > field.most) {
         refuse(field, text,
                "a number from " + std::to_string(field.least) + " to " + std::to_string(field.most));
     }
-    return number;
+    return *number;
 }
 
 bool flagIn(const SettingsField& field, const std::string& text) {

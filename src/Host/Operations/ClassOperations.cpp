@@ -57,10 +57,8 @@ void setPropagated(ClassDeclaration& declaration) {
 /// where the name first appeared, and a key stays one.
 template <class Element>
 void addElement(std::vector<Element>& elements, Element declared, const std::string& className) {
-    const auto found = std::find_if(elements.begin(), elements.end(), [&](const Element& element) {
-        return core::sameName(element.name, declared.name);
-    });
-    if (found == elements.end()) {
+    Element* found = core::findByName(elements, declared.name);
+    if (found == nullptr) {
         declared.origin = className;
         elements.push_back(std::move(declared));
         return;

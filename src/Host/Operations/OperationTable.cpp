@@ -1,6 +1,4 @@
 // SPDX-License-Identifier: Apache-2.0
-#include <algorithm>
-
 #include "Host/Operations/Operations.h"
 
 namespace host {
@@ -132,9 +130,7 @@ const std::vector<Operation> kOperations{
 }  // namespace
 
 const Operation* findOperation(std::string_view name) {
-    const auto found = std::find_if(kOperations.begin(), kOperations.end(),
-                                    [&](const Operation& each) { return core::sameName(each.name, name); });
-    return found == kOperations.end() ? nullptr : &*found;
+    return core::findByName(kOperations, name);
 }
 
 }  // namespace host

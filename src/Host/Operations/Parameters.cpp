@@ -1,8 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Host/Operations/Parameters.h"
 
-#include <algorithm>
-
 #include "Framework/Model/CimError.h"
 
 namespace host {
@@ -51,12 +49,11 @@ bool isNull(const ParameterValue& value) {
 Parameters::Parameters(const cimxml::IntrinsicCall& call, std::span<const ParameterSpec> allowed)
     : m_call(call) {
     for (const Parameter& parameter : call.parameters) {
-        const auto same = [&](const auto& other) { return core::sameName(other.name, parameter.name); };
-        const auto known = std::find_if(allowed.begin(), allowed.end(), same);
-        if (known == allowed.end()) refuse(call.operation + " has no parameter " + parameter.name);
+        const ParameterSpec* known = core::findByName(allowed, parameter.name);
+        if (known == nullptr) refuse(call.operation + " has no parameter " + parameter.name);
         // Which of two values counts would be anybody's guess.
-        const auto first = std::find_if(call.parameters.begin(), call.parameters.end(), same);
-        if (&*first != &parameter) refuse(parameter.name + " is given twice");
+        if (core::findByName(call.parameters, parameter.name) != &parameter)
+            refuse(parameter.name + " is given twice");
         if (!isNull(parameter.value) && !isOfKind(known->kind, parameter.value)) {
             refuse(parameter.name + " is a value of another kind");
         }
@@ -67,10 +64,8 @@ Parameters::Parameters(const cimxml::IntrinsicCall& call, std::span<const Parame
 }
 
 const ParameterValue* Parameters::find(std::string_view name) const {
-    for (const Parameter& parameter : m_call.parameters) {
-        if (core::sameName(parameter.name, name)) return isNull(parameter.value) ? nullptr : &parameter.value;
-    }
-    return nullptr;
+    const Parameter* parameter = core::findByName(m_call.parameters, name);
+    return parameter == nullptr || isNull(parameter->value) ? nullptr : &parameter->value;
 }
 
 bool Parameters::flag(std::string_view name, bool otherwise) const {

@@ -1,6 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
 #include <algorithm>
-#include <charconv>
 #include <functional>
 
 #include "Framework/Model/CimType.h"
@@ -37,11 +36,7 @@ std::optional<std::uint64_t> contentLengthOf(const HttpHead& head) {
     // 9112 11.2).
     if (texts.empty() || std::adjacent_find(texts.begin(), texts.end(), std::not_equal_to<>()) != texts.end())
         return std::nullopt;
-    std::uint64_t length = 0;
-    const char* end = texts.front().data() + texts.front().size();
-    const auto result = std::from_chars(texts.front().data(), end, length);
-    if (result.ec != std::errc() || result.ptr != end) return std::nullopt;
-    return length;
+    return utils::parseNumber<std::uint64_t>(texts.front());
 }
 
 std::optional<HttpAnswer> checkHead(const HttpHead& head, std::size_t bodyLimit) {

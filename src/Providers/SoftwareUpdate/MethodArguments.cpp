@@ -60,15 +60,6 @@ std::string findUri(const std::string& identifier) {
     return uri;
 }
 
-std::string join(const utils::StringArray& names) {
-    std::string text;
-    for (const std::string& name : names) {
-        if (&name != &names.front()) text += InstallOption::kTargetTypeSeparator;
-        text += name;
-    }
-    return text;
-}
-
 /// The identity, if it is one of a firmware image; null, with a line in the log, if not.
 const inventory::SoftwareIdentity* imageIdentity(const MethodKind& kind, const core::CimPath& source) {
     const core::CimInstance* instance = findInstance(source);
@@ -103,7 +94,8 @@ std::optional<unsigned int> resolveSource(const MethodKind& kind, const core::Ci
         return MethodReturn::InvalidParameter;
     }
     QUENX_DEBUG("URI is: %s", order.uri.c_str());
-    const std::string targetTypes = join(identity->getTargetTypes());
+    const std::string targetTypes =
+        utils::joined(identity->getTargetTypes(), {&InstallOption::kTargetTypeSeparator, 1});
     if (targetTypes.empty()) {
         QUENX_DEBUG("Source '%s' does not contain any TargetTypes", source.toString().c_str());
         return MethodReturn::InvalidParameter;

@@ -338,7 +338,7 @@ TEST_F(MethodsTest, WhatIsAdvertisedWorksAndWhatIsNotIsRefused) {
     }
     // Target types: each is known, though not each is in the image.
     for (const auto& type : *capabilities.find("SupportedTargetTypes")->value.elements()) {
-        const std::string name = core::scalarText(core::CimType::String, type);
+        const std::string name = core::scalarText(type);
         const std::uint32_t expected = name == "IMG_PXE" || name == "IMG_UEFI" ? kJobStarted : 4106;
         EXPECT_EQ(outcome(fromUri(m_uri, m_port, {32768, 5}, {name})), expected) << name;
     }

@@ -68,10 +68,10 @@ std::uint32_t UpdateClient::number(const core::InstanceValue& instance, const ch
 std::string UpdateClient::text(const core::InstanceValue& instance, const char* property) {
     const core::PropertyValue* found = instance.find(property);
     if (found == nullptr || found->value.isNull()) return {};
-    if (!found->value.isArray) return core::scalarText(found->value.type, *found->value.scalar());
+    if (!found->value.isArray) return core::scalarText(*found->value.scalar());
     std::string joined;
     for (const CimScalar& element : *found->value.elements())
-        joined += (joined.empty() ? "" : ", ") + core::scalarText(found->value.type, element);
+        joined += (joined.empty() ? "" : ", ") + core::scalarText(element);
     return joined;
 }
 
