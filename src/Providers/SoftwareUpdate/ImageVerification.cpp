@@ -154,19 +154,20 @@ PreparedImage readAndPrepare(const UpdateOrder& order, bool& isAskingAdapter) {
     // The adapter API counts in 32 bits.
     const auto fileSize = static_cast<std::uint32_t>(os::getFileSize(path));
     const Buffer source = readImage(uri, path, fileSize);
-    PreparedImage image{std::make_unique_for_overwrite<std::uint8_t[]>(fileSize), fileSize,
-                        getTargetTypes(options, values)};
+    Buffer image = std::make_unique_for_overwrite<std::uint8_t[]>(fileSize);
+    std::uint32_t imageSize = fileSize;
+    std::vector<utils::FirmwareType> types = getTargetTypes(options, values);
 
     utils::formatDebugLog(__FILE__, kCheckAndVerifyImage, __LINE__, "Start preparing the image");
     isAskingAdapter = true;
-    const int status = ma::prepareFlashImage(adapterName, source.get(), fileSize, image.bytes.get(),
-                                             &image.size, image.types);
+    const int status =
+        ma::prepareFlashImage(adapterName, source.get(), fileSize, image.get(), &imageSize, types);
     isAskingAdapter = false;
     utils::formatDebugLog(__FILE__, kCheckAndVerifyImage, __LINE__, "Image prepared %d", status);
     const bool force =
         Quenx_SoftwareInstallationService::IsValueDefined(InstallOption::ForceInstallation, options);
     judge(status, force, uri, adapterName);
-    return image;
+    return {std::move(image), imageSize, std::move(types)};
 }
 
 }  // namespace

@@ -16,22 +16,6 @@ constexpr std::uint32_t kTerminationPoll = 50;  // ms
 constexpr int kDestructionTimeout = 3000;       // ms
 constexpr std::uint32_t kTimeoutErrorCode = 4;
 
-/// A binary search. ma::prepareFlashImage() leaves the types ascending; only a backend that answers a status
-/// which is not known may leave them as they were requested, and the search may then miss.
-bool holdsType(const std::vector<utils::FirmwareType>& types, utils::FirmwareType wanted) {
-    std::size_t begin = 0;
-    std::size_t end = types.size();
-    while (begin < end) {
-        const std::size_t middle = begin + (end - begin) / 2;
-        if (types[middle] < wanted) {
-            begin = middle + 1;
-        } else {
-            end = middle;
-        }
-    }
-    return begin < types.size() && types[begin] == wanted;
-}
-
 }  // namespace
 
 std::atomic<std::int32_t> JobThread::executionCount{0};
@@ -45,7 +29,9 @@ JobThread::~JobThread() {
     QUENX_DEBUG("Destroying JobThread %p", static_cast<const void*>(this));
     if (m_started == true) {
         QUENX_DEBUG("Destroying JobThread %p, waiting for terminate", static_cast<const void*>(this));
-        if (terminate(kDestructionTimeout)) {
+        // Not terminate(): no class derived from this one is left that could have its own say.
+        JobThread::stopFwUpdateExecution();
+        if (waitForEnd(kDestructionTimeout)) {
             QUENX_DEBUG("JobThread %p, terminated", static_cast<const void*>(this));
         } else {
             QUENX_ERROR("JobThread %p, terminating timeout error", static_cast<const void*>(this));
@@ -66,6 +52,10 @@ void JobThread::stopFwUpdateExecution() {
 
 bool JobThread::terminate(int timeout) {
     stopFwUpdateExecution();
+    return waitForEnd(timeout);
+}
+
+bool JobThread::waitForEnd(int timeout) const {
     // Polled: the worker may be within the adapter API, which nothing interrupts.
     while (m_executed == false && timeout > 0) {
         msleep(kTerminationPoll);
@@ -98,9 +88,12 @@ bool JobThread::flash() {
     // Fails when the process has no locker; one that is busy does not matter.
     const os::OSLocker::AutoOSLocker adapterLock;
     const std::string adapterName = m_myJob->getAdapterName();
+    const std::vector<utils::FirmwareType> types = m_myJob->getImageTypes();
     // Before the write: on a device that does lose the image, a cut in between would leave an adapter that
-    // boots from what is not there.
-    if (!holdsType(m_myJob->getImageTypes(), utils::FirmwareType::iSCSI)) resetBootType(adapterName);
+    // boots from what is not there. ma::prepareFlashImage() leaves the types ascending; only a backend that
+    // answers a status which is not known may leave them as requested, and the search may then miss.
+    if (!std::binary_search(types.begin(), types.end(), utils::FirmwareType::iSCSI))
+        resetBootType(adapterName);
 
     std::uint32_t errorCode = 0;
     std::string errorText;
@@ -113,8 +106,7 @@ bool JobThread::flash() {
 
     QUENX_DEBUG("Updating CapabilityWord");
     // The word tells the adapter which of its images to run, so it must not name one that was not written.
-    const bool updated =
-        ma::updateCapabilityWord(adapterName, m_myJob->getImageTypes(), errorCode, errorText);
+    const bool updated = ma::updateCapabilityWord(adapterName, types, errorCode, errorText);
     m_myJob->setLastError(errorCode, errorText);
     return updated;
 }

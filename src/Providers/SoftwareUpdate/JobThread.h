@@ -4,9 +4,7 @@
 #include <atomic>
 #include <cstdint>
 #include <string>
-#include <vector>
 
-#include "Utils/FirmwareTypes.h"
 #include "Utils/Os/Linux/Thread.h"
 
 class Quenx_ConcreteJob;
@@ -36,6 +34,7 @@ class JobThread : public utils::Thread {
     static std::atomic<std::int32_t> executionCount;
 
   private:
+    bool waitForEnd(int timeout) const;
     bool flash();
     void resetBootType(const std::string& adapterName);
 
