@@ -4,7 +4,7 @@
 
 #include <span>
 
-#include "MidAPI/Image/OptionRomWriter.h"
+#include "MidAPI/Image/OptionRom.h"
 #include "Providers/SoftwareUpdate/ImageVerification.h"
 #include "Support/SimulatedAdapters.h"
 #include "Support/TestRoms.h"

@@ -3,7 +3,7 @@
 
 #include "Fuzz/Fuzz.h"
 #include "MidAPI/Image/ImagePreparation.h"
-#include "MidAPI/Image/OptionRomWriter.h"
+#include "MidAPI/Image/OptionRom.h"
 
 namespace {
 

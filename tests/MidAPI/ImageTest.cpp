@@ -6,7 +6,7 @@
 #include <numeric>
 
 #include "MidAPI/Image/ImagePreparation.h"
-#include "MidAPI/Image/OptionRomWriter.h"
+#include "MidAPI/Image/OptionRom.h"
 #include "MidAPI/Image/RomFormat.h"
 #include "MidAPI/ma.h"
 #include "Support/SimulatedAdapters.h"

@@ -7,7 +7,6 @@
 #include <vector>
 
 #include "MidAPI/Image/OptionRom.h"
-#include "MidAPI/Image/OptionRomWriter.h"
 
 namespace test {
 

@@ -4,7 +4,7 @@
 #include <algorithm>
 #include <optional>
 
-#include "MidAPI/Image/OptionRomWriter.h"
+#include "MidAPI/Image/OptionRom.h"
 
 namespace ma {
 namespace {
@@ -13,10 +13,7 @@ using Types = std::vector<utils::FirmwareType>;
 using Components = std::vector<utils::FirmwareVersionInfo>;
 
 Preparation refuse(PrepareStatus status, std::string reason) {
-    Preparation refusal;
-    refusal.status = status;
-    refusal.reason = std::move(reason);
-    return refusal;
+    return {.status = status, .reason = std::move(reason)};
 }
 
 std::string typeNames(const Components& components) {
@@ -58,8 +55,7 @@ Types normalised(Types types) {
 
 bool isWanted(const RomImage& image, const Types& requested) {
     if (requested.empty()) return image.type != utils::FirmwareType{};
-    return std::any_of(requested.begin(), requested.end(),
-                       [&image](utils::FirmwareType type) { return image.carries(type); });
+    return std::ranges::any_of(requested, [&](utils::FirmwareType type) { return image.carries(type); });
 }
 
 std::optional<std::uint32_t> versionOf(const Components& components, utils::FirmwareType type) {

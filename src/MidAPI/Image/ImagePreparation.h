@@ -25,11 +25,11 @@ struct PreparationTarget {
 /// The verdict on an image file.
 struct Preparation {
     PrepareStatus status = PrepareStatus::Prepared;
-    std::string reason;  ///< a sentence for people; empty for PrepareStatus::Prepared
+    std::string reason = {};  ///< a sentence for people; empty for PrepareStatus::Prepared
     /// The images to write; filled for PrepareStatus::Prepared and the two that force allows.
-    std::vector<RomImage> chosen;
+    std::vector<RomImage> chosen = {};
     /// Of those, ascending.
-    std::vector<utils::FirmwareType> types;
+    std::vector<utils::FirmwareType> types = {};
 };
 
 /// Holds an image file against an adapter, without writing anything: which images of `requested` types (type

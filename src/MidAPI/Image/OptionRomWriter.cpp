@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "MidAPI/Image/OptionRomWriter.h"
+#include "MidAPI/Image/OptionRom.h"
 
 #include <algorithm>
 #include <string_view>

@@ -8,7 +8,6 @@
 #include <vector>
 
 #include "MidAPI/AdapterTypes.h"
-#include "Utils/Export.h"
 #include "Utils/Os/Linux/Mutex.h"
 
 namespace ma {

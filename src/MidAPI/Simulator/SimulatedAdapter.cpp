@@ -9,7 +9,7 @@
 #include <thread>
 
 #include "MidAPI/Image/ImagePreparation.h"
-#include "MidAPI/Image/OptionRomWriter.h"
+#include "MidAPI/Image/OptionRom.h"
 #include "Utils/Log.h"
 #include "Utils/Os/Linux/linux.h"
 #include "Utils/Utils.h"
