@@ -5,7 +5,6 @@
 
 #include <memory>
 #include <string>
-#include <utility>
 #include <vector>
 
 #include "Framework/Classes/CimBroker.h"
@@ -18,6 +17,16 @@
 template <class... Property>
 void setNull(Property&... properties) {
     (properties.setNull(), ...);
+}
+
+/// Sets a property to what is known, or makes it null.
+template <class Property, class Value>
+void setOrNull(Property& property, bool isKnown, const Value& value) {
+    if (isKnown) {
+        property = value;
+    } else {
+        property.setNull();
+    }
 }
 
 /// The instances of a class as the broker finds them, those that are a T. Holds them while it lives.
@@ -134,7 +143,10 @@ class CachedClass : public ListedClass<T> {
   protected:
     /// The instances for these keys, all of them fresh.
     core::InstanceList::Iterator serve(const std::vector<Key>& keys) {
-        if (!rebuild(keys)) refresh();
+        if (!rebuild(keys)) {
+            for (core::CimInstance* instance : core::InstanceRange(this->m_instances.getElements(false)))
+                static_cast<T*>(instance)->refresh();
+        }
         return this->m_instances.getElements(false);
     }
 
@@ -152,11 +164,6 @@ class CachedClass : public ListedClass<T> {
         m_keys = keys;
         this->m_instances.publish(rebuilt);
         return true;
-    }
-
-    void refresh() {
-        for (core::CimInstance* instance : core::InstanceRange(this->m_instances.getElements(false)))
-            static_cast<T*>(instance)->refresh();
     }
 
     utils::Mutex m_mutex;

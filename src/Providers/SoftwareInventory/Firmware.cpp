@@ -39,10 +39,6 @@ std::int64_t nanoseconds(const timespec& time) {
     return static_cast<std::int64_t>(time.tv_sec) * 1'000'000'000 + time.tv_nsec;
 }
 
-bool hasSignature(std::span<const std::uint8_t> bytes) {
-    return bytes[0] == (ma::rom::kSignature & 0xff) && bytes[1] == ma::rom::kSignature >> 8;
-}
-
 /// The bytes of a file that begins as a ROM does; otherwise nothing, and the reason.
 std::vector<std::uint8_t> readRom(const std::string& path, std::int64_t size, std::string& problem) {
     // Two bytes tell most other files apart, however large those are.
@@ -51,7 +47,7 @@ std::vector<std::uint8_t> readRom(const std::string& path, std::int64_t size, st
         problem = "it is too large for an option ROM";
     } else if (os::readFile(path, bytes) != bytes.size()) {
         problem = "it is empty or cannot be read";
-    } else if (!hasSignature(bytes)) {
+    } else if (ma::readLe16(bytes, 0) != ma::rom::kSignature) {
         problem = "it is not an option ROM";
     } else {
         bytes.resize(static_cast<std::size_t>(size));
@@ -83,13 +79,11 @@ std::vector<Firmware> readInstalled(const std::vector<Port>& ports) {
         if (!info) continue;
         // Components are updated one by one, so each has an identity with a version of its own.
         for (FirmwareComponent& component : namedComponents(info->components)) {
-            Firmware firmware;
-            firmware.identifier = port.adapter + ":" + component.type;
-            firmware.typeCode = SoftwareIdentity::InstalledComponent;
-            firmware.adapter = port.adapter;
-            firmware.ids = ma::formatIds(info->ids.vendor, info->ids.device);
-            firmware.components.push_back(std::move(component));
-            installed.push_back(std::move(firmware));
+            installed.push_back({.identifier = port.adapter + ":" + component.type,
+                                 .typeCode = SoftwareIdentity::InstalledComponent,
+                                 .adapter = port.adapter,
+                                 .ids = ma::formatIds(info->ids.vendor, info->ids.device),
+                                 .components = {std::move(component)}});
         }
     }
     return installed;

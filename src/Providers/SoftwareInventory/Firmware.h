@@ -30,8 +30,8 @@ struct Firmware {
     std::string adapter;                        ///< on which it is installed; empty for a file
     std::string ids;                            ///< vendor and device, as "1af4:1041"
     std::vector<FirmwareComponent> components;  ///< in ascending order of type
-    std::string manufacturer;                   ///< empty when the image names none
-    std::string product;                        ///< likewise
+    std::string manufacturer = {};              ///< empty when the image names none
+    std::string product = {};                   ///< likewise
 
     bool operator==(const Firmware&) const = default;
 };

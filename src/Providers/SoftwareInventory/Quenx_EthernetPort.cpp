@@ -2,6 +2,7 @@
 #include "Providers/SoftwareInventory/Quenx_EthernetPort.h"
 
 #include "MidAPI/ma.h"
+#include "Providers/RegisteredProfile.h"
 #include "Providers/SoftwareInventory/Devices.h"
 #include "Utils/Utils.h"
 
@@ -43,15 +44,17 @@ void Quenx_EthernetPort::setLink(const std::optional<ma::AdapterInfo>& info) {
     PermanentAddress = addressText(info->permanentMac);
     NetworkAddresses = std::vector<std::string>{addressText(info->permanentMac)};
     // A link that is down has no speed, which is not a speed of 0.
-    if (info->speed != 0) {
-        Speed = info->speed;
-    } else {
-        Speed.setNull();
-    }
+    setOrNull(Speed, info->speed != 0, info->speed);
 }
 
 core::InstanceList::Iterator Quenx_EthernetPortClass::getInstances() {
     QUENX_DEBUG("getInstances");
     const utils::TimeStamp time("Quenx_EthernetPortClass::getInstances");
     return serve(inventory::readPorts());
+}
+
+void Quenx_EthernetPortRegisteredProfile::refresh() {
+    // The version is that of DSP1014.
+    registerProfile(*this, kEthernetPortProfile, "Ethernet Port", "1.0.1",
+                    "Ethernet Port Profile for Tarvel(R) Ethernet Adapters");
 }

@@ -3,6 +3,7 @@
 
 #include "Providers/ClassObjects.h"
 #include "Providers/Schema/CIM_EthernetPort.h"
+#include "Providers/Schema/CIM_RegisteredProfile.h"
 #include "Providers/Schema/ProviderInterfaces.h"
 #include "Providers/SoftwareInventory/Devices.h"
 
@@ -32,4 +33,16 @@ class Quenx_EthernetPort : public CIM_EthernetPort, public inventory::EthernetPo
 class Quenx_EthernetPortClass : public CachedClass<Quenx_EthernetPort, inventory::Port> {
   public:
     core::InstanceList::Iterator getInstances() override;
+};
+
+/// Says that the ports are modelled as DMTF DSP1014 has it. Served as "Quenx_RegisteredProfile", a class that
+/// other providers serve too.
+class Quenx_EthernetPortRegisteredProfile : public CIM_RegisteredProfile {
+  public:
+    static constexpr core::CimClassInfo classInfo{"Quenx_RegisteredProfile",
+                                                  &CIM_RegisteredProfile::classInfo};
+
+    std::string getClassName() const override { return classInfo.name; }
+
+    virtual void refresh();
 };

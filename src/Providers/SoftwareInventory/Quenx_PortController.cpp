@@ -1,7 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Providers/SoftwareInventory/Quenx_PortController.h"
 
-#include <algorithm>
 #include <map>
 
 #include "MidAPI/ma.h"
@@ -44,13 +43,9 @@ void Quenx_PortController::refresh() {
 
     const core::RecursiveLocker lock(getMutex());
     inventory::setIdentification(*this, inventory::identify(getUniqId(), info, updatable));
-    if (info) {
-        inventory::setDeviceState(*this, inventory::EnabledState::Enabled);
-        Description = info->description;
-    } else {
-        inventory::setDeviceState(*this, inventory::EnabledState::Unknown);
-        Description.setNull();
-    }
+    using inventory::EnabledState;
+    inventory::setDeviceState(*this, info ? EnabledState::Enabled : EnabledState::Unknown);
+    setOrNull(Description, info.has_value(), info ? info->description : "");
 }
 
 utils::PCIAddr Quenx_PortController::getPCIAddress() const {

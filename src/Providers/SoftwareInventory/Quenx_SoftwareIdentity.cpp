@@ -17,15 +17,6 @@ std::vector<std::uint16_t> classify(const std::vector<inventory::FirmwareCompone
     return result;
 }
 
-/// Sets a text, or null where there is none.
-void setText(core::CimPropertyString& property, const std::string& text) {
-    if (text.empty()) {
-        property.setNull();
-    } else {
-        property = text;
-    }
-}
-
 }  // namespace
 
 Quenx_SoftwareIdentity::Quenx_SoftwareIdentity(inventory::Firmware firmware)
@@ -37,8 +28,8 @@ void Quenx_SoftwareIdentity::refresh() {
     const core::RecursiveLocker lock(getMutex());
     setKind();
     setVersions();
-    setText(Manufacturer, m_firmware.manufacturer);
-    setText(Name, m_firmware.product);
+    setOrNull(Manufacturer, !m_firmware.manufacturer.empty(), m_firmware.manufacturer);
+    setOrNull(Name, !m_firmware.product.empty(), m_firmware.product);
     TargetTypes = getTargetTypes();
     Classifications = classify(m_firmware.components);
 }
@@ -63,16 +54,12 @@ void Quenx_SoftwareIdentity::setVersions() {
         values.push_back(version);
         types.push_back("Quenx:" + part.type);
     }
-    setText(VersionString, text);
+    setOrNull(VersionString, !text.empty(), text);
     ElementName = text.empty() ? m_firmware.ids : m_firmware.ids + " " + text;
     IdentityInfoValue = std::move(values);
     IdentityInfoType = std::move(types);
-    if (m_firmware.components.empty()) {
-        MajorVersion.setNull();
-    } else {
-        // Code revisions of images have 16 bits.
-        MajorVersion = static_cast<std::uint16_t>(highest);
-    }
+    // Code revisions of images have 16 bits.
+    setOrNull(MajorVersion, !m_firmware.components.empty(), static_cast<std::uint16_t>(highest));
 }
 
 utils::StringArray Quenx_SoftwareIdentity::getTargetTypes() const {

@@ -1,7 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Providers/SoftwareInventory/Quenx_ElementSoftwareIdentity.h"
 #include "Providers/SoftwareInventory/Quenx_EthernetPort.h"
-#include "Providers/SoftwareInventory/Quenx_EthernetPortRegisteredProfile.h"
 #include "Providers/SoftwareInventory/Quenx_PortController.h"
 #include "Providers/SoftwareInventory/Quenx_SoftwareIdentity.h"
 #include "Providers/SoftwareInventory/Quenx_SoftwareIdentityResource.h"
@@ -21,7 +20,8 @@ class SoftwareInventoryAgent : public core::CimAgent {
         m_classes.add(new Quenx_SoftwareIdentityClass(catalog));
         m_classes.add(new Quenx_SoftwareIdentityResourceClass(catalog));
         m_classes.add(new Quenx_ElementSoftwareIdentityClass);
-        m_classes.add(new Quenx_EthernetPortRegisteredProfileClass);
+        m_classes.add(new SingletonClass<Quenx_EthernetPortRegisteredProfile>(
+            "RegisteredProfile::getInstances", __FILE__, __LINE__));
     }
     ~SoftwareInventoryAgent() override { leaveBroker(); }
 };
