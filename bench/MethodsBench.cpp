@@ -3,7 +3,7 @@
 #include <benchmark/benchmark.h>
 #include <dlfcn.h>
 
-#include "Framework/Classes/InstanceLifetime.h"
+#include "Framework/Classes/InstanceList.h"
 #include "Framework/Requests/CimRequests.h"
 #include "InstantAdapters.h"
 #include "Providers/SoftwareUpdate/SoftwareUpdateAgent.h"

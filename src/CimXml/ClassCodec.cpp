@@ -2,7 +2,6 @@
 #include <algorithm>
 
 #include "CimXml/ElementCodec.h"
-#include "CimXml/Message.h"
 
 namespace cimxml {
 
@@ -42,7 +41,7 @@ std::vector<Qualifier> readQualifiers(const pugi::xml_node& element) {
 }
 
 bool isSet(const std::vector<Qualifier>& qualifiers, std::string_view name) {
-    const Qualifier* qualifier = core::findQualifier(qualifiers, name);
+    const Qualifier* qualifier = core::findByName(qualifiers, name);
     const bool* flag = qualifier == nullptr ? nullptr : qualifier->value.get<bool>();
     return flag != nullptr && *flag;
 }
@@ -109,7 +108,7 @@ void writeQualifiers(XmlWriter& writer, const std::vector<Qualifier>& qualifiers
         writer.start("QUALIFIER").attribute("NAME", qualifier.name);
         writer.attribute("TYPE", core::typeName(qualifier.value.type));
         if (qualifier.isPropagated) writer.attribute("PROPAGATED", "true");
-        const auto* declaration = core::findQualifierDeclaration(qualifier.name);
+        const auto* declaration = core::findByName(core::qualifierDeclarations(), qualifier.name);
         if (declaration != nullptr) writeFlavors(writer, *declaration);
         writer.content();
         writeValue(writer, qualifier.value);
@@ -207,8 +206,7 @@ void writeQualifierDeclaration(XmlWriter& writer, const core::QualifierDeclarati
     writer.content().start("SCOPE");
     // Readers disagree on the default of a scope that is left out, so all seven are there.
     for (const std::string_view scope : core::qualifierScopes()) {
-        const bool isIn = std::find(declaration.scopes.begin(), declaration.scopes.end(), scope) !=
-                          declaration.scopes.end();
+        const bool isIn = std::ranges::find(declaration.scopes, scope) != declaration.scopes.end();
         writer.attribute(scope, isIn ? "true" : "false");
     }
     writer.empty();

@@ -5,6 +5,7 @@
 #include <pugixml.hpp>
 #include <string>
 #include <string_view>
+#include <vector>
 
 #include "CimXml/Xml.h"
 #include "Framework/Model/ClassDeclaration.h"
@@ -12,9 +13,44 @@
 
 namespace cimxml {
 
-// The elements that requests and responses have in common: paths, values, classes.
+/// What a message carries, with the wrapping taken off.
+struct Envelope {
+    std::string messageId;
+    pugi::xml_node content;  ///< the call or the response; lives as long as the document
+};
 
-// Reading. WireError (not valid) for an element that is none of those named, or holds something else.
+/// Reads the bytes into the document and opens CIM, MESSAGE and SIMPLEREQ or SIMPLERSP, as named. Any minor
+/// version is taken. Throws WireError.
+Envelope openEnvelope(pugi::xml_document& document, std::string_view bytes, std::string_view wrapper);
+
+/// Writes the same in front of a message's content, and behind it.
+void startEnvelope(XmlWriter& writer, std::string_view messageId, std::string_view wrapper);
+void endEnvelope(XmlWriter& writer, std::string_view wrapper);
+
+// Reading what is inside: the elements that requests and responses have in common. Whatever a reader finds
+// wrong with them is WireError (not valid).
+
+/// The child elements, in order. Refuses text between them.
+std::vector<pugi::xml_node> childElements(const pugi::xml_node& element);
+
+/// The one child element. Refuses none, and more than one.
+pugi::xml_node onlyChild(const pugi::xml_node& element);
+
+/// The value of an attribute that must be there.
+std::string requiredAttribute(const pugi::xml_node& element, const char* name);
+
+/// The text of an element that holds nothing but text, blanks included.
+std::string textOf(const pugi::xml_node& element);
+
+inline bool isElement(const pugi::xml_node& element, std::string_view name) {
+    return name == element.name();
+}
+
+/// Refuses an element of another name.
+void expectElement(const pugi::xml_node& element, std::string_view name);
+
+/// Throws WireError (not valid) that names the element.
+[[noreturn]] void refuseElement(const pugi::xml_node& element, std::string_view why);
 
 /// How the keys of paths are read.
 enum class KeyTyping {

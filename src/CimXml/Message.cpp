@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "CimXml/Message.h"
+#include "CimXml/ElementCodec.h"
 
 #include "CimXml/WireError.h"
 
@@ -14,7 +14,7 @@ void parseDocument(pugi::xml_document& document, std::string_view bytes) {
                                       pugi::parse_wconv_attribute | pugi::parse_ws_pcdata;
     const pugi::xml_parse_result result =
         document.load_buffer(bytes.data(), bytes.size(), kOptions, pugi::encoding_utf8);
-    if (!result) throw WireError(WireFault::kNotWellFormed, result.description());
+    if (!result) throw WireError(faults::kNotWellFormed, result.description());
 }
 
 /// Only the major version tells of another language; a client may use any minor one.
@@ -45,17 +45,17 @@ Envelope openEnvelope(pugi::xml_document& document, std::string_view bytes, std:
     parseDocument(document, bytes);
     const pugi::xml_node root = document.document_element();
     expectElement(root, "CIM");
-    checkVersion(root, "CIMVERSION", "2.", WireFault::kUnsupportedCimVersion);
-    checkVersion(root, "DTDVERSION", "2.", WireFault::kUnsupportedDtdVersion);
+    checkVersion(root, "CIMVERSION", "2.", faults::kUnsupportedCimVersion);
+    checkVersion(root, "DTDVERSION", "2.", faults::kUnsupportedDtdVersion);
     const pugi::xml_node message = onlyChild(root);
     expectElement(message, "MESSAGE");
     Envelope envelope;
     envelope.messageId = requiredAttribute(message, "ID");
-    checkVersion(message, "PROTOCOLVERSION", "1.", WireFault::kUnsupportedProtocol);
+    checkVersion(message, "PROTOCOLVERSION", "1.", faults::kUnsupportedProtocol);
     const pugi::xml_node wrapped = onlyChild(message);
     // Refused by its own name, so that a client that can batch falls back to single requests.
     if (isElement(wrapped, "MULTIREQ")) {
-        throw WireError(WireFault::kMultipleRequests, "several requests in one message");
+        throw WireError(faults::kMultipleRequests, "several requests in one message");
     }
     expectElement(wrapped, wrapper);
     envelope.content = contentOf(wrapped);
@@ -116,7 +116,7 @@ void expectElement(const pugi::xml_node& element, std::string_view name) {
 }
 
 void refuseElement(const pugi::xml_node& element, std::string_view why) {
-    throw WireError(WireFault::kNotValid, "element " + std::string(element.name()) + " " + std::string(why));
+    throw WireError(faults::kNotValid, "element " + std::string(element.name()) + " " + std::string(why));
 }
 
 }  // namespace cimxml

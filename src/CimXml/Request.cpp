@@ -4,7 +4,6 @@
 #include <utility>
 
 #include "CimXml/ElementCodec.h"
-#include "CimXml/Message.h"
 
 namespace cimxml {
 
@@ -70,17 +69,6 @@ IntrinsicCall readIntrinsicCall(const pugi::xml_node& element) {
     return call;
 }
 
-void completeReferences(core::CimValue& value, const std::string& namespaceName) {
-    const auto complete = [&](core::CimScalar& scalar) {
-        if (auto* path = std::get_if<core::CimPath>(&scalar)) path->completeNamespace(namespaceName);
-    };
-    if (auto* single = std::get_if<core::CimScalar>(&value.data)) complete(*single);
-    if (auto* elements = std::get_if<std::vector<core::CimScalar>>(&value.data)) {
-        for (core::CimScalar& each : *elements)
-            complete(each);
-    }
-}
-
 void readArgument(const pugi::xml_node& element, MethodCall& call) {
     expectElement(element, "PARAMVALUE");
     core::Argument& argument = call.arguments.emplace_back();
@@ -89,7 +77,7 @@ void readArgument(const pugi::xml_node& element, MethodCall& call) {
     argument.isUntyped = !type;
     if (auto value = readValue(element, type, std::nullopt, KeyTyping::Text)) {
         argument.value = std::move(*value);
-        completeReferences(argument.value, call.object.getNamespace());
+        argument.value.completeNamespace(call.object.getNamespace());
     } else if (call.mistypedArgument.empty()) {
         call.mistypedArgument = argument.name;
     }

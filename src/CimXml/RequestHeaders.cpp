@@ -29,9 +29,7 @@ std::string percentDecoded(std::string_view text) {
 bool isSameNamespace(std::string_view header, const std::string& body) {
     // The host that may stand in front is not compared: a proxy or a second name may change it.
     if (header.starts_with("//")) header.remove_prefix(std::min(header.find('/', 2), header.size()));
-    core::CimPath path;
-    path.setNamespace(header);  // without the slashes at its ends
-    return core::sameName(path.getNamespace(), body);
+    return core::sameName(utils::trimOf(header, "/"), body);
 }
 
 std::string withoutEscapes(std::string text) {
@@ -80,24 +78,24 @@ struct ObjectMatcher {
 }  // namespace
 
 void checkHeaders(const RequestHeaders& headers) {
-    if (headers.batch) throw WireError(WireFault::kMultipleRequests, "several requests in one message");
+    if (headers.batch) throw WireError(faults::kMultipleRequests, "several requests in one message");
     if (headers.operation && !core::sameName(*headers.operation, "MethodCall")) {
-        throw WireError(WireFault::kUnsupportedOperation, "CIMOperation is not MethodCall");
+        throw WireError(faults::kUnsupportedOperation, "CIMOperation is not MethodCall");
     }
     // Without the header it is 1.0 (DSP0200 6.2).
     if (headers.protocolVersion && !headers.protocolVersion->starts_with("1.")) {
-        throw WireError(WireFault::kUnsupportedProtocol, "CIMProtocolVersion is not 1.x");
+        throw WireError(faults::kUnsupportedProtocol, "CIMProtocolVersion is not 1.x");
     }
 }
 
 void checkHeadersAgainst(const RequestHeaders& headers, const Request& request) {
     if (headers.method && !core::sameName(percentDecoded(*headers.method), request.name())) {
-        throw WireError(WireFault::kHeaderMismatch, "CIMMethod is not the method that the message calls");
+        throw WireError(faults::kHeaderMismatch, "CIMMethod is not the method that the message calls");
     }
     if (!headers.object) return;
     const std::string object = percentDecoded(*headers.object);
     if (!std::visit(ObjectMatcher{object}, request.call)) {
-        throw WireError(WireFault::kHeaderMismatch, "CIMObject is not the object that the message names");
+        throw WireError(faults::kHeaderMismatch, "CIMObject is not the object that the message names");
     }
 }
 

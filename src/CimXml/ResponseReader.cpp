@@ -2,7 +2,6 @@
 #include <algorithm>
 
 #include "CimXml/ElementCodec.h"
-#include "CimXml/Message.h"
 #include "CimXml/Response.h"
 #include "Utils/Utils.h"
 

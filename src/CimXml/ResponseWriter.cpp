@@ -1,6 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "CimXml/ElementCodec.h"
-#include "CimXml/Message.h"
 #include "CimXml/Response.h"
 
 namespace cimxml {

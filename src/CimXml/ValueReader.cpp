@@ -4,7 +4,6 @@
 #include <utility>
 
 #include "CimXml/ElementCodec.h"
-#include "CimXml/Message.h"
 
 namespace cimxml {
 
@@ -67,8 +66,7 @@ void readLocation(const pugi::xml_node& element, core::CimPath& path) {
 bool isFullPath(const pugi::xml_node& element) {
     constexpr std::array<std::string_view, 4> kFullPaths{"LOCALINSTANCEPATH", "INSTANCEPATH",
                                                          "LOCALCLASSPATH", "CLASSPATH"};
-    return std::find(kFullPaths.begin(), kFullPaths.end(), std::string_view(element.name())) !=
-           kFullPaths.end();
+    return std::ranges::find(kFullPaths, std::string_view(element.name())) != kFullPaths.end();
 }
 
 /// One VALUE of the type; nothing when its text is no such value.

@@ -59,7 +59,7 @@ class Scanner {
 
   private:
     [[noreturn]] static void refuse(const std::string& text) {
-        throw WireError(WireFault::kNotWellFormed, text);
+        throw WireError(faults::kNotWellFormed, text);
     }
 
     /// Takes what is before the position, or everything when it is npos.
@@ -226,7 +226,7 @@ class Scanner {
 void checkWellFormed(std::string_view document, const XmlLimits& limits) {
     if (document.starts_with("\xEF\xBB\xBF")) document.remove_prefix(3);
     if (!isXmlText(document)) {
-        throw WireError(WireFault::kNotWellFormed, "a byte that is no character of XML in UTF-8");
+        throw WireError(faults::kNotWellFormed, "a byte that is no character of XML in UTF-8");
     }
     Scanner(document, limits).scan();
 }

@@ -9,10 +9,6 @@
 
 #include "Utils/Utils.h"
 
-#ifndef QUENX_VERSION
-#define QUENX_VERSION "unknown"
-#endif
-
 namespace cli {
 
 namespace {

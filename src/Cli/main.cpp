@@ -2,7 +2,6 @@
 // quenxctl: reads the arguments, opens the way to the model, runs the verb, says what went wrong.
 #include <unistd.h>
 
-#include <array>
 #include <atomic>
 #include <cerrno>
 #include <chrono>

@@ -1,11 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
 #include <pthread.h>
 
-#include <cerrno>
 #include <csignal>
 #include <ctime>
 #include <exception>
-#include <iostream>
 
 #include "Host/Daemon/CommandLine.h"
 #include "Host/Daemon/Daemon.h"

@@ -9,7 +9,7 @@
 #include <thread>
 
 #include "Framework/Classes/CimBroker.h"
-#include "Framework/Classes/InstanceLifetime.h"
+#include "Framework/Classes/RequestScope.h"
 #include "Support/TestModel.h"
 
 namespace {

@@ -2,7 +2,6 @@
 // Memory runs out at the n-th allocation of an update, for every n.
 #include <thread>
 
-#include "Framework/Classes/InstanceLifetime.h"
 #include "Providers/SoftwareUpdate/UpdateTest.h"
 #include "Reliability/Effort.h"
 #include "Reliability/Interposed.h"

@@ -2,7 +2,7 @@
 // Every call that an update makes fails, throws or stalls, one at a time.
 #include <thread>
 
-#include "Framework/Classes/InstanceLifetime.h"
+#include "Framework/Classes/InstanceList.h"
 #include "Providers/SoftwareUpdate/MethodResults.h"
 #include "Providers/SoftwareUpdate/UpdateTest.h"
 #include "Reliability/Effort.h"

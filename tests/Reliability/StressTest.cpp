@@ -6,7 +6,6 @@
 #include <thread>
 
 #include "Framework/Classes/CimBroker.h"
-#include "Framework/Classes/InstanceLifetime.h"
 #include "Framework/Classes/InstanceList.h"
 #include "Providers/SoftwareUpdate/JobThread.h"
 #include "Providers/SoftwareUpdate/UpdateTest.h"

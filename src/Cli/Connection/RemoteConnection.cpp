@@ -87,11 +87,6 @@ void requireOk(const HttpReply& reply) {
     throw NoAnswer(ExitStatus::Failed, why, "Check that --server names a CIM-XML server.");
 }
 
-void requireAnswerTo(const cimxml::Request& request, const cimxml::Response& response) {
-    if (response.messageId != request.messageId || !core::sameName(response.name, request.name()))
-        refuseAnswer("The server's answer belongs to another request.");
-}
-
 /// What a server answers over CIM-XML.
 class RemoteOperations : public core::CimOperations {
   public:
@@ -164,7 +159,8 @@ cimxml::Response RemoteOperations::send(cimxml::Request request, const std::stri
     requireOk(reply);
     try {
         cimxml::Response response = cimxml::readResponse(reply.body);
-        requireAnswerTo(request, response);
+        if (response.messageId != request.messageId || !core::sameName(response.name, request.name()))
+            refuseAnswer("The server's answer belongs to another request.");
         if (const auto* error = std::get_if<cimxml::ErrorResult>(&response.content))
             throw core::CimError(error->status, error->description);
         return response;

@@ -65,8 +65,7 @@ std::string printable(std::string_view text) {
 }
 
 std::size_t columnsOf(std::string_view text) {
-    return static_cast<std::size_t>(
-        std::count_if(text.begin(), text.end(), [](char c) { return !continues(c); }));
+    return static_cast<std::size_t>(std::ranges::count(text, false, continues));
 }
 
 std::string elideMiddle(std::string_view text, std::size_t width) {

@@ -87,25 +87,25 @@ Comparison compare(const ma::RomFile& rom, const Adapter& adapter, const std::ve
         if (!type.empty() && isChosen) result.chosen.push_back({type, component.version});
     }
     for (const std::string& type : types) {
-        const bool isThere = std::any_of(rom.images.begin(), rom.images.end(),
-                                         [&](const ma::RomImage& image) { return carries(image, type); });
+        const bool isThere =
+            std::ranges::any_of(rom.images, [&](const auto& image) { return carries(image, type); });
         // "IMG_PXE+" asks for an empty type besides, which the service ignores, too.
         if (!type.empty() && !isThere) result.missing.push_back(type);
     }
     for (const ma::RomImage& image : rom.images) {
-        const bool isChosen =
-            types.empty() || std::any_of(types.begin(), types.end(),
-                                         [&](const std::string& type) { return carries(image, type); });
+        const bool isChosen = types.empty() || std::ranges::any_of(types, [&](const auto& type) {
+                                  return carries(image, type);
+                              });
         // An image can carry two types, and is written whole for either.
         if (isChosen) result.bytes += image.length;
         result.isNetwork = result.isNetwork && image.isNetwork();
     }
     // An adapter that does not show its ids can be compared with nothing; the service knows them.
     if (!adapter.ids.empty()) result.foreignIds = firstForeignIds(rom, adapter.ids);
-    result.current = !result.chosen.empty() &&
-                     std::all_of(result.chosen.begin(), result.chosen.end(), [&](const Component& component) {
-                         return versionOf(adapter.components, component.type) == component.version;
-                     });
+    result.current =
+        !result.chosen.empty() && std::ranges::all_of(result.chosen, [&](const Component& component) {
+            return versionOf(adapter.components, component.type) == component.version;
+        });
     return result;
 }
 

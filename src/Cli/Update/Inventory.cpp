@@ -58,8 +58,7 @@ void to_json(Json& json, const Component& component) {
 }
 
 std::optional<std::uint32_t> versionOf(const std::vector<Component>& components, std::string_view type) {
-    const auto found = std::find_if(components.begin(), components.end(),
-                                    [type](const Component& component) { return component.type == type; });
+    const auto found = std::ranges::find(components, type, &Component::type);
     return found == components.end() ? std::nullopt : std::optional(found->version);
 }
 
@@ -162,9 +161,8 @@ InventoryItem findById(core::CimOperations& operations, const std::string& id) {
 InventoryItem findByFile(core::CimOperations& operations, const std::string& file) {
     const std::string wanted = imageUri(file);
     for (InventoryItem& item : readInventory(operations)) {
-        const bool isIt = std::any_of(item.uris.begin(), item.uris.end(),
-                                      [&](const std::string& uri) { return isSameFile(uri, wanted); });
-        if (isIt) return std::move(item);
+        if (std::ranges::any_of(item.uris, [&](const auto& uri) { return isSameFile(uri, wanted); }))
+            return std::move(item);
     }
     throw CommandError(ExitStatus::NotFound, "The service's inventory does not have " + file + ".",
                        kAskInventory);

@@ -25,10 +25,10 @@ void nameAdapters(core::CimOperations& operations, std::vector<JobView>& jobs) {
         const core::CimPath* element = endOf(affected, "AffectedElement");
         const core::CimPath* affecting = endOf(affected, "AffectingElement");
         if (element == nullptr || affecting == nullptr) continue;
-        const auto port = std::find_if(ports.begin(), ports.end(),
-                                       [&](const auto& each) { return each.path.isSameObjectAs(*element); });
-        const auto job = std::find_if(jobs.begin(), jobs.end(),
-                                      [&](const auto& each) { return each.path.isSameObjectAs(*affecting); });
+        const auto port =
+            std::ranges::find_if(ports, [&](const auto& each) { return each.path.isSameObjectAs(*element); });
+        const auto job = std::ranges::find_if(
+            jobs, [&](const auto& each) { return each.path.isSameObjectAs(*affecting); });
         // A job affects the card of its port, too; only the port is an adapter.
         if (port != ports.end() && job != jobs.end()) job->adapter = port->text("Name");
     }

@@ -1,7 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Cli/Update/Service.h"
 
-#include <algorithm>
 #include <cerrno>
 #include <system_error>
 

@@ -2,7 +2,7 @@
 #include "Cli/Update/Service.h"
 
 #include "Framework/Classes/CimBroker.h"
-#include "Framework/Classes/InstanceLifetime.h"
+#include "Framework/Classes/RequestScope.h"
 #include "Framework/Model/CimInstance.h"
 #include "Providers/Schema/ProviderInterfaces.h"
 #include "Providers/Schema/ValueMaps.h"

@@ -96,9 +96,8 @@ void endAsCurrent(Outcome& outcome, const Candidate& candidate) {
 bool isInPlace(const Candidate& candidate, const std::vector<Component>& after) {
     if (!candidate.comparison || after.empty()) return true;
     const std::vector<Component>& chosen = candidate.comparison->chosen;
-    return std::all_of(chosen.begin(), chosen.end(), [&](const Component& component) {
-        return std::find(after.begin(), after.end(), component) != after.end();
-    });
+    return std::ranges::all_of(
+        chosen, [&](const Component& each) { return std::ranges::find(after, each) != after.end(); });
 }
 
 /// For an update that completed, as the service says.

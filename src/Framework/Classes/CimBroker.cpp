@@ -3,8 +3,6 @@
 
 #include <algorithm>
 
-#include "Framework/Classes/InstanceLifetime.h"
-#include "Framework/Classes/InstanceList.h"
 #include "Framework/Model/CimInstance.h"
 #include "Framework/Model/CimValue.h"
 
@@ -48,19 +46,6 @@ void CimAgent::leaveBroker() noexcept {
     drainReaper();
 }
 
-AgentUse::AgentUse(std::shared_ptr<AgentRegistration> registration) noexcept
-    : m_registration(std::move(registration)) {
-    m_registration->users.fetch_add(1, std::memory_order_acq_rel);
-}
-
-AgentUse::~AgentUse() {
-    if (m_registration == nullptr) return;
-    m_registration->users.fetch_sub(1, std::memory_order_acq_rel);
-    m_registration->users.notify_all();
-}
-
-CimBroker::CimBroker() = default;
-
 CimBroker::~CimBroker() = default;
 
 void CimBroker::addAgent(CimAgent* agent) {
@@ -75,9 +60,8 @@ void CimBroker::removeAgent(CimAgent* agent) noexcept {
     std::shared_ptr<AgentRegistration> leaving;
     {
         const utils::Mutex::AutoLocker lock(m_mutex);
-        const auto found = std::find_if(m_agents.begin(), m_agents.end(), [&](const auto& registration) {
-            return registration->agent == agent;
-        });
+        const auto found =
+            std::ranges::find_if(m_agents, [&](const auto& each) { return each->agent == agent; });
         if (found == m_agents.end()) return;
         leaving = std::move(*found);
         m_agents.erase(found);

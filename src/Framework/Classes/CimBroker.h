@@ -1,12 +1,12 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
-#include <atomic>
 #include <memory>
 #include <string>
 #include <vector>
 
 #include "Framework/Classes/CimClass.h"
+#include "Framework/Classes/RequestScope.h"
 
 namespace core {
 
@@ -42,33 +42,10 @@ class QUENX_EXPORT CimAgent {
     std::string m_providerName;
 };
 
-/// One agent's entry with the broker; counts the requests that use the agent.
-struct AgentRegistration {
-    CimAgent* agent = nullptr;
-    std::atomic<int> users{0};
-};
-
-/// Keeps an agent from leaving while it lives. Movable, not copyable.
-class QUENX_EXPORT AgentUse {
-  public:
-    explicit AgentUse(std::shared_ptr<AgentRegistration> registration) noexcept;
-    AgentUse(AgentUse&&) noexcept = default;
-    AgentUse& operator=(AgentUse&&) = delete;
-    ~AgentUse();
-
-    CimAgent& agent() const { return *m_registration->agent; }
-    bool uses(const std::shared_ptr<AgentRegistration>& registration) const {
-        return m_registration == registration;
-    }
-
-  private:
-    std::shared_ptr<AgentRegistration> m_registration;
-};
-
 /// Knows all agents of the process. Thread-safe.
 class QUENX_EXPORT CimBroker {
   public:
-    CimBroker();
+    CimBroker() = default;
     CimBroker(const CimBroker&) = delete;
     CimBroker& operator=(const CimBroker&) = delete;
 

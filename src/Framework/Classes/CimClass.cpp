@@ -16,8 +16,6 @@ ClassChain undeclared(const std::string& name) {
 
 }  // namespace
 
-CimClass::CimClass() = default;
-
 utils::SafeList<CimInstance*>::Iterator CimClass::getInstances() {
     return joinInstances({});
 }
@@ -29,8 +27,6 @@ void CimClass::enableIndications() {}
 void CimClass::disableIndications() {}
 
 CimClass::~CimClass() = default;
-
-CimClasses::CimClasses() = default;
 
 CimClasses::~CimClasses() {
     clear();

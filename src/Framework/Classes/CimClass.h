@@ -17,7 +17,7 @@ class CimPath;
 /// A class object: serves the instances of one class. Called from several threads at once.
 class QUENX_EXPORT CimClass {
   public:
-    CimClass();
+    CimClass() = default;
     CimClass(const CimClass&) = delete;
     CimClass& operator=(const CimClass&) = delete;
 
@@ -62,7 +62,7 @@ struct ServedClass {
 /// Filled while the agent is built; look-ups are thread-safe.
 class QUENX_EXPORT CimClasses {
   public:
-    CimClasses();
+    CimClasses() = default;
     ~CimClasses();
     CimClasses(const CimClasses&) = delete;
     CimClasses& operator=(const CimClasses&) = delete;

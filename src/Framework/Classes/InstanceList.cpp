@@ -2,8 +2,13 @@
 #include "Framework/Classes/InstanceList.h"
 
 #include <algorithm>
+#include <condition_variable>
+#include <cstdint>
+#include <exception>
+#include <mutex>
+#include <thread>
 
-#include "Framework/Classes/InstanceLifetime.h"
+#include "Framework/Classes/RequestScope.h"
 #include "Framework/Model/CimInstance.h"
 
 namespace core {
@@ -45,6 +50,107 @@ void holdInScope(std::shared_ptr<const void> object) {
 }
 
 }  // namespace
+
+/// The queue of instances to destroy, and the one thread that destroys them. The queue is linked through the
+/// instances, so that queueing one never needs memory.
+class InstanceReaper {
+  public:
+    InstanceReaper() = default;
+    InstanceReaper(const InstanceReaper&) = delete;
+    InstanceReaper& operator=(const InstanceReaper&) = delete;
+
+    ~InstanceReaper() {
+        drain();
+        {
+            const std::lock_guard lock(m_mutex);
+            m_ending = true;
+        }
+        m_changed.notify_all();
+        if (m_thread.joinable()) m_thread.join();
+    }
+
+    /// Destroyed at the end of the process, after whatever was built after prepareReaper().
+    static InstanceReaper& theOne() {
+        static InstanceReaper reaper;
+        return reaper;
+    }
+
+    /// The deleter of listed instances, for one that nobody holds any more. Never fails and never waits.
+    static void release(CimInstance* instance) noexcept {
+        if (instance != nullptr && instance->m_destructionWaits) {
+            theOne().add(instance);
+        } else {
+            delete instance;
+        }
+    }
+
+    /// A thread that was refused is asked for again: the daemon calls this until everything is destroyed.
+    bool isWorking() noexcept {
+        const std::lock_guard lock(m_mutex);
+        return (m_first != nullptr && startThread()) || m_busy;
+    }
+
+    void add(CimInstance* instance) noexcept {
+        {
+            const std::lock_guard lock(m_mutex);
+            (m_last == nullptr ? m_first : m_last->m_nextToDestroy) = instance;
+            m_last = instance;
+            startThread();
+        }
+        m_changed.notify_all();
+    }
+
+    void drain() noexcept {
+        std::unique_lock lock(m_mutex);
+        // Without a thread the caller does the work, since it must not go on before it is done.
+        if (m_first != nullptr && !startThread()) destroyQueued(lock);
+        m_changed.wait(lock, [this] { return m_first == nullptr && m_busy == 0; });
+    }
+
+  private:
+    /// Under the lock. False when the system refuses a thread.
+    bool startThread() noexcept {
+        if (m_thread.joinable()) return true;
+        try {
+            m_thread = std::thread([this] { run(); });
+            return true;
+        } catch (const std::exception&) {
+            return false;
+        }
+    }
+
+    void run() noexcept {
+        std::unique_lock lock(m_mutex);
+        while (!m_ending) {
+            m_changed.wait(lock, [this] { return m_first != nullptr || m_ending; });
+            destroyQueued(lock);
+        }
+    }
+
+    /// Under the lock, which it gives up while a destructor runs.
+    void destroyQueued(std::unique_lock<std::mutex>& lock) noexcept {
+        while (m_first != nullptr) {
+            CimInstance* instance = m_first;
+            m_first = instance->m_nextToDestroy;
+            if (m_first == nullptr) m_last = nullptr;
+            ++m_busy;
+            // The destructor waits, for a flash, say; and it may release instances that end up here.
+            lock.unlock();
+            delete instance;
+            lock.lock();
+            --m_busy;
+            m_changed.notify_all();
+        }
+    }
+
+    std::mutex m_mutex;
+    std::condition_variable m_changed;
+    std::thread m_thread;
+    CimInstance* m_first = nullptr;
+    CimInstance* m_last = nullptr;
+    std::uint32_t m_busy = 0;  ///< how many are being destroyed
+    bool m_ending = false;
+};
 
 /// A list and its instances end in any order: an instance that a request still holds outlives its list, and
 /// may be marked as deleted after that. So both look at each other through this.
@@ -97,7 +203,7 @@ InstanceList::SharedSnapshot InstanceList::snapshot() {
 
 void InstanceList::add(CimInstance* element) {
     // Owned before anything can throw, so that a caller never has to clean up.
-    const std::shared_ptr<CimInstance> owned(element, InstanceRelease{});
+    const std::shared_ptr<CimInstance> owned(element, &InstanceReaper::release);
     element->m_list = m_link;
     holdInScope(owned);
     SharedSnapshot outdated;
@@ -127,8 +233,7 @@ bool InstanceList::remove(const CimInstance* element) {
     std::shared_ptr<CimInstance> released;
     SharedSnapshot outdated;
     const utils::Mutex::AutoLocker lock(getMutex());
-    const auto found = std::find_if(m_held.begin(), m_held.end(),
-                                    [&](const auto& candidate) { return candidate.get() == element; });
+    const auto found = std::ranges::find_if(m_held, [&](const auto& each) { return each.get() == element; });
     if (found == m_held.end()) return false;
     released = std::move(*found);
     m_held.erase(found);
@@ -166,6 +271,18 @@ InstanceList::Iterator joinInstances(std::vector<InstanceList::Iterator> parts) 
         }
     }
     return InstanceList::Iterator(std::make_unique<SnapshotIterator>(std::move(joined)));
+}
+
+void prepareReaper() {
+    InstanceReaper::theOne();
+}
+
+void drainReaper() noexcept {
+    InstanceReaper::theOne().drain();
+}
+
+bool isReaperBusy() noexcept {
+    return InstanceReaper::theOne().isWorking();
 }
 
 }  // namespace core

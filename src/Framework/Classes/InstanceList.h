@@ -53,6 +53,19 @@ class QUENX_EXPORT InstanceList : public utils::SafeList<CimInstance*>,
 QUENX_EXPORT utils::SafeList<CimInstance*>::Iterator joinInstances(
     std::vector<utils::SafeList<CimInstance*>::Iterator> parts);
 
+// A released instance whose destructor waits (CimInstance::setDestructionWaits) is destroyed by the reaper,
+// on a thread of its own. Where that thread cannot be had, it stays queued until the next one comes, or
+// drainReaper().
+
+/// Makes sure that the reaper is built, and so destroyed after the object that is being built now.
+void prepareReaper();
+
+/// Returns when every instance that was queued is destroyed, code of its library included.
+QUENX_EXPORT void drainReaper() noexcept;
+
+/// Whether the thread still has instances to destroy.
+QUENX_EXPORT bool isReaperBusy() noexcept;
+
 /// Lets a for loop walk an enumeration: `for (CimInstance* each : InstanceRange(broker->getInstances(...)))`.
 /// Holds the enumeration's elements while it lives; can be walked again when a walk has ended.
 class InstanceRange {

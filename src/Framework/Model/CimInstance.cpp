@@ -63,8 +63,6 @@ std::shared_ptr<const CimInstance::Shape> CimInstance::findShape(
     return shape;
 }
 
-CimInstance::CimInstance() = default;
-
 CimInstance::~CimInstance() = default;
 
 std::string CimInstance::getClassName() const {
@@ -100,17 +98,13 @@ unsigned int CimInstance::modifyInstance(CimPropertyList& requested) {
 // Found by name at each call: a method takes milliseconds, and instances have three at most.
 unsigned int CimInstance::invokeMethod(std::string name, CimPropertyList& in, CimPropertyList& out,
                                        CimInstance*& result) {
-    const auto method = std::find_if(m_methods.begin(), m_methods.end(),
-                                     [&](const auto& entry) { return sameName(entry.first, name); });
+    const auto method =
+        std::ranges::find_if(m_methods, [&](const auto& entry) { return sameName(entry.first, name); });
     if (method == m_methods.end()) {
         throw CimError(CimStatus::MethodNotAvailable,
                        getClassName() + " does not implement the method " + name);
     }
     return (this->*(method->second))(in, out, result);
-}
-
-void CimInstance::registerMethod(std::string name, Method method) {
-    m_methods.emplace_back(std::move(name), method);
 }
 
 void CimInstance::setDeleted(bool deleted) {

@@ -63,7 +63,7 @@ class QUENX_EXPORT CimInstance {
     /// list.
     using Method = unsigned int (CimInstance::*)(CimPropertyList&, CimPropertyList&, CimInstance*&);
 
-    CimInstance();
+    CimInstance() = default;
     CimInstance(const CimInstance&) = delete;
     CimInstance& operator=(const CimInstance&) = delete;
 
@@ -107,7 +107,7 @@ class QUENX_EXPORT CimInstance {
     template <class T>
     void addMethod(std::string name,
                    unsigned int (T::*method)(CimPropertyList&, CimPropertyList&, CimInstance*&)) {
-        registerMethod(std::move(name), static_cast<Method>(method));
+        m_methods.emplace_back(std::move(name), static_cast<Method>(method));
     }
 
     /// Says that the properties built since the last call belong to this class. Called at the end of each
@@ -123,12 +123,10 @@ class QUENX_EXPORT CimInstance {
     friend class CimProperty;
     friend class InstanceList;
     friend class InstanceReaper;
-    friend struct InstanceRelease;
 
     static std::shared_ptr<const Shape> findShape(const std::vector<CimProperty*>& properties);
     const Shape& shape() const QUENX_REQUIRES(m_mutex);
     std::vector<CimProperty*> select(const std::vector<std::size_t>& indices) const;
-    void registerMethod(std::string name, Method method);
     void registerProperty(CimProperty* property);
     void unregisterProperty(CimProperty* property) noexcept;
     /// When a key has changed.

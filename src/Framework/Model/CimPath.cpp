@@ -17,7 +17,7 @@ bool isNameStart(char c) {
 
 bool isName(std::string_view text) {
     return !text.empty() && isNameStart(text.front()) &&
-           std::all_of(text.begin(), text.end(), [](char c) { return isNameStart(c) || utils::isDigit(c); });
+           std::ranges::all_of(text, [](char c) { return isNameStart(c) || utils::isDigit(c); });
 }
 
 std::string keyText(const CimScalar& value) {
@@ -142,11 +142,7 @@ std::string CimPath::toString() const {
 }
 
 void CimPath::setNamespace(std::string_view name) {
-    while (name.starts_with('/'))
-        name.remove_prefix(1);
-    while (name.ends_with('/'))
-        name.remove_suffix(1);
-    m_namespace = name;
+    m_namespace = utils::trimOf(name, "/");
 }
 
 void CimPath::completeNamespace(std::string_view name) {
@@ -154,6 +150,12 @@ void CimPath::completeNamespace(std::string_view name) {
     for (CimKey& key : m_keys) {
         if (auto* reference = std::get_if<CimPath>(&key.value)) reference->completeNamespace(name);
     }
+}
+
+void CimValue::completeNamespace(std::string_view name) {
+    forEach([&](CimScalar& scalar) {
+        if (auto* path = std::get_if<CimPath>(&scalar)) path->completeNamespace(name);
+    });
 }
 
 bool CimPath::isSameObjectAs(const CimPath& other) const {

@@ -25,15 +25,12 @@ std::string typeText(CimType type, bool isArray) {
 
 /// The value with every element held as the type wants it; CimError where one does not fit.
 CimValue converted(const CimProperty& property, CimType type, CimValue value) {
-    const auto convert = [&](CimScalar& scalar) {
+    if (value.isArray != property.isArray()) refuseType(property, type, value);
+    value.forEach([&](CimScalar& scalar) {
         auto held = convertScalar(type, scalar);
         if (!held) refuseType(property, type, value);
         scalar = std::move(*held);
-    };
-    if (value.isArray != property.isArray()) refuseType(property, type, value);
-    if (auto* scalar = std::get_if<CimScalar>(&value.data)) convert(*scalar);
-    if (auto* elements = std::get_if<std::vector<CimScalar>>(&value.data))
-        std::for_each(elements->begin(), elements->end(), convert);
+    });
     value.type = type;
     return value;
 }
@@ -82,13 +79,9 @@ void CimProperty::Listener::onPropertyModify(CimProperty*, CimProperty*) {}
 void CimProperty::Listener::onPropertyVerify(CimProperty*, CimProperty*) {}
 CimProperty::Listener::~Listener() = default;
 
-CimProperty::Guard::Guard(const CimProperty& property) : m_owner(property.m_owner) {
+std::unique_lock<RecursiveMutex> CimProperty::lockOwner() const {
     // An argument of a method has no owner, and belongs to one thread.
-    if (m_owner != nullptr) m_owner->getMutex().lock();
-}
-
-CimProperty::Guard::~Guard() {
-    if (m_owner != nullptr) m_owner->getMutex().unlock();
+    return m_owner == nullptr ? std::unique_lock<RecursiveMutex>() : std::unique_lock(m_owner->getMutex());
 }
 
 CimProperty::CimProperty(const char* name, CimInstance* owner, CimType type, bool isArray)
@@ -139,7 +132,7 @@ void CimProperty::verify(CimProperty* requested) {
 }
 
 void CimProperty::setNull() {
-    const Guard guard(*this);
+    const auto lock = lockOwner();
     changed(true);
 }
 
@@ -149,13 +142,13 @@ void CimProperty::changed(bool isNull) {
 }
 
 bool CimProperty::IsNull() const {
-    const Guard guard(*this);
+    const auto lock = lockOwner();
     return m_null;
 }
 
 CimValue CimProperty::getValue() const {
     CimValue value = CimValue::null(m_type, m_array);
-    const Guard guard(*this);
+    const auto lock = lockOwner();
     if (!m_null) load(value);
     return value;
 }
@@ -163,7 +156,7 @@ CimValue CimProperty::getValue() const {
 void CimProperty::setValue(const CimValue& value) {
     // Converted before the lock: a reader waits for the swap alone.
     const CimValue held = converted(*this, m_type, value);
-    const Guard guard(*this);
+    const auto lock = lockOwner();
     if (!held.isNull()) store(held);
     changed(held.isNull());
 }
@@ -179,7 +172,7 @@ CimPropertyScalar<T, Type>::CimPropertyScalar(const char* name, CimInstance* own
 
 template <class T, CimType Type>
 CimPropertyScalar<T, Type>& CimPropertyScalar<T, Type>::operator=(T value) {
-    const Guard guard(*this);
+    const auto lock = lockOwner();
     m_value = std::move(value);
     changed();
     return *this;
@@ -187,7 +180,7 @@ CimPropertyScalar<T, Type>& CimPropertyScalar<T, Type>::operator=(T value) {
 
 template <class T, CimType Type>
 T CimPropertyScalar<T, Type>::get() const {
-    const Guard guard(*this);
+    const auto lock = lockOwner();
     return isNull() ? unset<T>() : m_value;
 }
 
@@ -207,7 +200,7 @@ CimPropertyArray<T, Type>::CimPropertyArray(const char* name, CimInstance* owner
 
 template <class T, CimType Type>
 void CimPropertyArray<T, Type>::push_back(T value) {
-    const Guard guard(*this);
+    const auto lock = lockOwner();
     if (isNull()) m_values.clear();
     m_values.push_back(std::move(value));
     changed();
@@ -220,7 +213,7 @@ void CimPropertyArray<T, Type>::clear() {
 
 template <class T, CimType Type>
 CimPropertyArray<T, Type>& CimPropertyArray<T, Type>::operator=(std::vector<T> values) {
-    const Guard guard(*this);
+    const auto lock = lockOwner();
     m_values = std::move(values);
     changed();
     return *this;
@@ -228,7 +221,7 @@ CimPropertyArray<T, Type>& CimPropertyArray<T, Type>::operator=(std::vector<T> v
 
 template <class T, CimType Type>
 std::vector<T> CimPropertyArray<T, Type>::get() const {
-    const Guard guard(*this);
+    const auto lock = lockOwner();
     return isNull() ? std::vector<T>() : m_values;
 }
 
@@ -247,15 +240,14 @@ void CimPropertyArray<T, Type>::store(const CimValue& value) {
     m_values = std::move(values);
 }
 
+void CimPropertyString::LengthListener::onPropertyModify(CimProperty* current, CimProperty* requested) {
+    onPropertyVerify(current, requested);
+}
+
 void CimPropertyString::CheckMaxLengthListener::onPropertyVerify(CimProperty* current,
                                                                  CimProperty* requested) {
     const std::size_t length = requestedText(requested).size();
     if (length > m_bound) refuse(current, length, "at most", m_bound);
-}
-
-void CimPropertyString::CheckMaxLengthListener::onPropertyModify(CimProperty* current,
-                                                                 CimProperty* requested) {
-    onPropertyVerify(current, requested);
 }
 
 void CimPropertyString::CheckMinLengthListener::onPropertyVerify(CimProperty* current,
@@ -264,23 +256,15 @@ void CimPropertyString::CheckMinLengthListener::onPropertyVerify(CimProperty* cu
     if (length < m_bound) refuse(current, length, "at least", m_bound);
 }
 
-void CimPropertyString::CheckMinLengthListener::onPropertyModify(CimProperty* current,
-                                                                 CimProperty* requested) {
-    onPropertyVerify(current, requested);
-}
-
-CimPropertyString::CimPropertyString(const char* name, CimInstance* owner)
-    : CimProperty(name, owner, CimType::String, false) {
+CimPropertyString::CimPropertyString(const char* name, CimInstance* owner) : CimPropertyScalar(name, owner) {
     addListener(&m_maxLength);
     addListener(&m_minLength);
 }
 
 CimPropertyString& CimPropertyString::operator=(std::string value) {
-    const Guard guard(*this);
+    const auto lock = lockOwner();
     // A refresh sets what mostly has not changed; a changed key would cost the instance its cached path.
-    if (!isNull() && m_value == value) return *this;
-    m_value = std::move(value);
-    changed();
+    if (isNull() || m_value != value) CimPropertyScalar::operator=(std::move(value));
     return *this;
 }
 
@@ -289,24 +273,11 @@ CimPropertyString& CimPropertyString::operator=(const CimPropertyString& other) 
     return *this;
 }
 
-std::string CimPropertyString::get() const {
-    const Guard guard(*this);
-    return isNull() ? std::string() : m_value;
-}
-
-void CimPropertyString::load(CimValue& value) const {
-    value.data = CimScalar(m_value);
-}
-
-void CimPropertyString::store(const CimValue& value) {
-    m_value = std::get<std::string>(*value.scalar());
-}
-
 CimPropertyRef::CimPropertyRef(const char* name, CimInstance* owner)
     : CimProperty(name, owner, CimType::Reference, false) {}
 
 CimPath CimPropertyRef::getPath() const {
-    const Guard guard(*this);
+    const auto lock = lockOwner();
     return isNull() ? CimPath() : *m_path;
 }
 
@@ -317,7 +288,7 @@ void CimPropertyRef::assign(const CimInstance* target) {
     }
     // Read the target before locking the owner: two instances are never locked at once.
     auto path = target->getPath();
-    const Guard guard(*this);
+    const auto lock = lockOwner();
     m_path = std::move(path);
     changed();
 }
@@ -332,6 +303,7 @@ void CimPropertyRef::store(const CimValue& value) {
 
 template class CimPropertyArray<std::string, CimType::String>;
 template class CimPropertyArray<unsigned short, CimType::Uint16>;
+template class CimPropertyScalar<std::string, CimType::String>;
 template class CimPropertyScalar<unsigned char, CimType::Uint8>;
 template class CimPropertyScalar<signed char, CimType::Sint8>;
 template class CimPropertyScalar<unsigned short, CimType::Uint16>;

@@ -5,6 +5,7 @@
 #include <cstdint>
 #include <limits>
 #include <memory>
+#include <mutex>
 #include <string>
 #include <vector>
 
@@ -16,6 +17,7 @@ namespace core {
 
 class CimInstance;
 class CimPath;
+class RecursiveMutex;
 struct CimValue;
 
 /// One property of an instance, or one argument of a method call.
@@ -78,17 +80,8 @@ class QUENX_EXPORT CimProperty {
 
     void setReferenceClass(const char* name) { m_referenceClass = name; }
 
-    /// Holds the owner's lock, where there is an owner.
-    class QUENX_EXPORT Guard {
-      public:
-        explicit Guard(const CimProperty& property);
-        ~Guard();
-        Guard(const Guard&) = delete;
-        Guard& operator=(const Guard&) = delete;
-
-      private:
-        const CimInstance* m_owner;
-    };
+    /// Takes the owner's lock, where there is an owner.
+    std::unique_lock<RecursiveMutex> lockOwner() const;
 
     /// Both under the owner's lock. To be called after each change of the value.
     bool isNull() const { return m_null; }
@@ -121,7 +114,6 @@ class CimPropertyScalar : public CimProperty {
     void load(CimValue& value) const override;
     void store(const CimValue& value) override;
 
-  private:
     T m_value;
 };
 
@@ -146,29 +138,34 @@ class CimPropertyArray : public CimProperty {
     std::vector<T> m_values;
 };
 
+// Before its first use: the one copy of the template, see below.
+extern template class QUENX_EXPORT CimPropertyScalar<std::string, CimType::String>;
+
 /// A text property, with a check of its length on requested values, which lets every length pass: a class
 /// that wants bounds adds listeners of its own.
-class QUENX_EXPORT CimPropertyString : public CimProperty {
+class QUENX_EXPORT CimPropertyString : public CimPropertyScalar<std::string, CimType::String> {
   public:
-    /// Refuses a requested text that is longer than the bound (in bytes).
-    class QUENX_EXPORT CheckMaxLengthListener : public Listener {
+    /// Holds a requested text against a bound of its length in bytes; one to be modified as one to be
+    /// verified.
+    class QUENX_EXPORT LengthListener : public Listener {
       public:
-        explicit CheckMaxLengthListener(std::size_t bound) : m_bound(bound) {}
+        explicit LengthListener(std::size_t bound) : m_bound(bound) {}
         void onPropertyModify(CimProperty* current, CimProperty* requested) override;
-        void onPropertyVerify(CimProperty* current, CimProperty* requested) override;
 
-      private:
+      protected:
         const std::size_t m_bound;
     };
-    /// Refuses a requested text that is shorter than the bound (in bytes).
-    class QUENX_EXPORT CheckMinLengthListener : public Listener {
+    /// Refuses a requested text that is longer than the bound.
+    class QUENX_EXPORT CheckMaxLengthListener : public LengthListener {
       public:
-        explicit CheckMinLengthListener(std::size_t bound) : m_bound(bound) {}
-        void onPropertyModify(CimProperty* current, CimProperty* requested) override;
+        using LengthListener::LengthListener;
         void onPropertyVerify(CimProperty* current, CimProperty* requested) override;
-
-      private:
-        const std::size_t m_bound;
+    };
+    /// Refuses a requested text that is shorter than the bound.
+    class QUENX_EXPORT CheckMinLengthListener : public LengthListener {
+      public:
+        using LengthListener::LengthListener;
+        void onPropertyVerify(CimProperty* current, CimProperty* requested) override;
     };
 
     CimPropertyString(const char* name, CimInstance* owner);
@@ -177,15 +174,8 @@ class QUENX_EXPORT CimPropertyString : public CimProperty {
     /// Copies the value, or the null state. The other is copied first, so two instances are never locked at
     /// once.
     CimPropertyString& operator=(const CimPropertyString& other);
-    /// Empty when null.
-    std::string get() const;
-
-  protected:
-    void load(CimValue& value) const override;
-    void store(const CimValue& value) override;
 
   private:
-    std::string m_value;
     CheckMaxLengthListener m_maxLength{std::numeric_limits<std::size_t>::max()};
     CheckMinLengthListener m_minLength{0};
 };

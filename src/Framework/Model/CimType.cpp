@@ -26,18 +26,6 @@ std::optional<CimType> typeByName(std::string_view name) {
     return std::nullopt;
 }
 
-bool isUnsigned(CimType type) {
-    return type >= CimType::Uint8 && type <= CimType::Uint64;
-}
-
-bool isSigned(CimType type) {
-    return type >= CimType::Sint8 && type <= CimType::Sint64;
-}
-
-bool isReal(CimType type) {
-    return type == CimType::Real32 || type == CimType::Real64;
-}
-
 bool sameName(std::string_view left, std::string_view right) {
     return utils::equalsIgnoringCase(left, right);
 }

@@ -35,9 +35,15 @@ QUENX_EXPORT std::string_view typeName(CimType type);
 /// The type of that name, compared without regard to case; nothing for an unknown name.
 QUENX_EXPORT std::optional<CimType> typeByName(std::string_view name);
 
-QUENX_EXPORT bool isUnsigned(CimType type);
-QUENX_EXPORT bool isSigned(CimType type);
-QUENX_EXPORT bool isReal(CimType type);
+constexpr bool isUnsigned(CimType type) {
+    return type >= CimType::Uint8 && type <= CimType::Uint64;
+}
+constexpr bool isSigned(CimType type) {
+    return type >= CimType::Sint8 && type <= CimType::Sint64;
+}
+constexpr bool isReal(CimType type) {
+    return type == CimType::Real32 || type == CimType::Real64;
+}
 
 /// CIM compares the names of classes, properties, methods and roles without regard to case (DSP0004 5.2.1).
 /// Only the letters of ASCII are folded.
@@ -49,8 +55,8 @@ QUENX_EXPORT std::string foldName(std::string_view name);
 /// The first element whose member `name` is that name, compared likewise; null when there is none.
 template <class Elements>
 auto* findByName(Elements& elements, std::string_view name) {
-    const auto found = std::find_if(elements.begin(), elements.end(),
-                                    [&](const auto& element) { return sameName(element.name, name); });
+    const auto found =
+        std::ranges::find_if(elements, [&](const auto& element) { return sameName(element.name, name); });
     return found == elements.end() ? nullptr : &*found;
 }
 

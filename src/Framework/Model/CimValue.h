@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include <algorithm>
 #include <cstdint>
 #include <optional>
 #include <string>
@@ -109,6 +110,14 @@ struct QUENX_EXPORT CimValue {
     const T* get() const {
         return scalar() == nullptr ? nullptr : std::get_if<T>(scalar());
     }
+    /// Calls the function with the single value, or with each element.
+    template <class Function>
+    void forEach(Function&& function) {
+        if (auto* single = std::get_if<CimScalar>(&data)) function(*single);
+        if (auto* each = std::get_if<std::vector<CimScalar>>(&data)) std::ranges::for_each(*each, function);
+    }
+    /// Sets the namespace in the paths that it holds, where there is none.
+    void completeNamespace(std::string_view name);
     /// The elements; null pointer when null or no array.
     const std::vector<CimScalar>* elements() const { return std::get_if<std::vector<CimScalar>>(&data); }
 };

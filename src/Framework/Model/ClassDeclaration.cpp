@@ -9,6 +9,7 @@
 #include "Framework/Model/CimInstance.h"
 #include "Framework/Model/CimProperty.h"
 #include "Utils/Os/Linux/Mutex.h"
+#include "Utils/Utils.h"
 
 namespace core {
 
@@ -115,16 +116,14 @@ MethodDeclaration declare(const CimMethodInfo& method) {
 
 /// The two arrays of a value map, which belong together by position.
 std::vector<Qualifier> valueMap(std::string_view text) {
+    if (text.empty()) return {};
     std::vector<CimScalar> values;
     std::vector<CimScalar> meanings;
-    while (!text.empty()) {
-        const std::string_view one = text.substr(0, text.find(';'));
-        text.remove_prefix(std::min(text.size(), one.size() + 1));
+    for (const std::string& one : utils::split(text, ';')) {
         const std::size_t equals = one.find('=');
-        values.emplace_back(std::string(one.substr(0, equals)));
-        meanings.emplace_back(std::string(one.substr(equals + 1)));
+        values.emplace_back(one.substr(0, equals));
+        meanings.emplace_back(one.substr(equals + 1));
     }
-    if (values.empty()) return {};
     return {{"ValueMap", CimValue::arrayOf(CimType::String, std::move(values))},
             {"Values", CimValue::arrayOf(CimType::String, std::move(meanings))}};
 }
@@ -205,20 +204,12 @@ const std::vector<QualifierDeclaration>& qualifierDeclarations() {
     return kDeclarations;
 }
 
-const QualifierDeclaration* findQualifierDeclaration(std::string_view name) {
-    return findByName(qualifierDeclarations(), name);
-}
-
-const Qualifier* findQualifier(const std::vector<Qualifier>& qualifiers, std::string_view name) {
-    return findByName(qualifiers, name);
-}
-
 std::vector<Qualifier> mergeQualifiers(std::vector<Qualifier> own, const std::vector<Qualifier>& inherited) {
     for (const Qualifier& one : inherited) {
         // A qualifier without a declaration comes from a foreign server; by default they are inherited.
-        const QualifierDeclaration* declaration = findQualifierDeclaration(one.name);
+        const QualifierDeclaration* declaration = findByName(qualifierDeclarations(), one.name);
         if (declaration != nullptr && !declaration->isInherited) continue;
-        if (findQualifier(own, one.name) == nullptr) own.push_back({one.name, one.value, true});
+        if (findByName(own, one.name) == nullptr) own.push_back({one.name, one.value, true});
     }
     return own;
 }
@@ -261,8 +252,8 @@ void addImpliedQualifiers(ClassDeclaration& declaration) {
 }
 
 bool derivesFrom(const ClassChain& chain, std::string_view className) {
-    return std::any_of(chain.begin(), chain.end(),
-                       [&](const auto& declaration) { return sameName(declaration->name, className); });
+    return std::ranges::any_of(
+        chain, [&](const auto& declaration) { return sameName(declaration->name, className); });
 }
 
 bool isBelow(const ClassChain& chain, std::string_view className, bool deep) {
@@ -273,8 +264,7 @@ bool isBelow(const ClassChain& chain, std::string_view className, bool deep) {
 }
 
 bool isAssociation(const ClassChain& chain) {
-    return std::any_of(chain.begin(), chain.end(),
-                       [](const auto& declaration) { return declaration->isAssociation; });
+    return std::ranges::any_of(chain, [](const auto& declaration) { return declaration->isAssociation; });
 }
 
 const MethodDeclaration* findMethod(const ClassChain& chain, std::string_view name) {

@@ -37,12 +37,6 @@ QUENX_EXPORT const std::vector<std::string_view>& qualifierScopes();
 /// All declarations, by name.
 QUENX_EXPORT const std::vector<QualifierDeclaration>& qualifierDeclarations();
 
-/// The declaration of that name, without regard to case; null for an unknown qualifier.
-QUENX_EXPORT const QualifierDeclaration* findQualifierDeclaration(std::string_view name);
-
-/// The qualifier of that name, without regard to case; null when it is not in the list.
-QUENX_EXPORT const Qualifier* findQualifier(const std::vector<Qualifier>& qualifiers, std::string_view name);
-
 /// What an element carries that has qualifiers of its own and inherits others: its own, then those inherited
 /// ones that it does not replace, marked as propagated.
 QUENX_EXPORT std::vector<Qualifier> mergeQualifiers(std::vector<Qualifier> own,

@@ -12,11 +12,9 @@ namespace {
 
 PropertyValue readProperty(const CimProperty& property, const std::string& namespaceName) {
     PropertyValue result{property.getName(), property.getValue(), property.isKey(), {}};
-    // Providers do not know in which namespace they are served.
     if (const char* target = property.getReferenceClass()) result.referenceClass = target;
-    if (auto* scalar = std::get_if<CimScalar>(&result.value.data)) {
-        if (auto* path = std::get_if<CimPath>(scalar)) path->completeNamespace(namespaceName);
-    }
+    // Providers do not know in which namespace they are served.
+    result.value.completeNamespace(namespaceName);
     return result;
 }
 
@@ -168,17 +166,13 @@ CimPath typedPath(const CimPath& path, const ClassLookup& classes) {
     return typedKeys(path, chain, classes);
 }
 
-const Argument* findArgument(const std::vector<Argument>& arguments, std::string_view name) {
-    return findByName(arguments, name);
-}
-
 std::vector<Argument> typedArguments(const MethodDeclaration& method, const std::vector<Argument>& arguments,
                                      const ClassLookup& classes) {
     std::vector<Argument> result;
     for (const Argument& given : arguments) {
         const ParameterDeclaration* declared = findByName(method.parameters, given.name);
         if (declared == nullptr) refuse(method.name + " has no parameter " + given.name);
-        if (findArgument(result, declared->name) != nullptr) refuse(declared->name + " is given twice");
+        if (findByName(result, declared->name) != nullptr) refuse(declared->name + " is given twice");
         auto value = typedValue(*declared, given, classes);
         if (!value) {
             refuse("parameter " + declared->name + " takes a value of type " +

@@ -146,7 +146,4 @@ QUENX_EXPORT CimPath typedPath(const CimPath& path, const ClassLookup& classes);
 std::vector<Argument> typedArguments(const MethodDeclaration& method, const std::vector<Argument>& arguments,
                                      const ClassLookup& classes);
 
-/// The argument of that name, without regard to case; null when it is not there.
-const Argument* findArgument(const std::vector<Argument>& arguments, std::string_view name);
-
 }  // namespace core

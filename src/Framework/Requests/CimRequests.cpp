@@ -42,7 +42,7 @@ struct CallLists {
 CallLists listsFor(const MethodDeclaration& method, const std::vector<Argument>& arguments) {
     CallLists lists;
     for (const ParameterDeclaration& parameter : method.parameters) {
-        const Argument* given = findArgument(arguments, parameter.name);
+        const Argument* given = findByName(arguments, parameter.name);
         const bool isOutput = parameter.direction == CimDirection::Out;
         // What is required and missing stays absent: the provider says so in its own words.
         if (given == nullptr && !isOutput && !parameter.optional) continue;
@@ -69,7 +69,7 @@ std::vector<Argument> outputsOf(const CallLists& lists, const std::vector<Argume
     for (const auto& property : lists.out.getProperties()) {
         if (sameName(property->getName(), kJobParameter)) continue;  // an instance, handed back
         CimValue value = property->getValue();
-        const Argument* given = findArgument(arguments, property->getName());
+        const Argument* given = findByName(arguments, property->getName());
         if (given != nullptr && sameValues(given->value, value)) continue;
         if (!value.isNull()) outputs.push_back({property->getName(), std::move(value)});
     }

@@ -77,6 +77,4 @@ ProviderSession::ProviderSession(const std::string& configurationFile) {
     m_operations = std::make_shared<CimRequests>(utils::SMASHv2Config::getInstance()->getNamespace());
 }
 
-ProviderSession::~ProviderSession() = default;
-
 }  // namespace core

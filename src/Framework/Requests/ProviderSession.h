@@ -61,7 +61,6 @@ class QUENX_EXPORT ProviderSession {
   public:
     /// @param configurationFile  empty for the system's
     explicit ProviderSession(const std::string& configurationFile);
-    ~ProviderSession();
     ProviderSession(const ProviderSession&) = delete;
     ProviderSession& operator=(const ProviderSession&) = delete;
 

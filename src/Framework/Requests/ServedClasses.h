@@ -5,7 +5,7 @@
 #include <vector>
 
 #include "Framework/Classes/CimBroker.h"
-#include "Framework/Classes/InstanceLifetime.h"
+#include "Framework/Classes/RequestScope.h"
 #include "Framework/Model/CimError.h"
 
 namespace core {

@@ -7,7 +7,6 @@
 #include <vector>
 
 #include "Utils/Os/Linux/Mutex.h"
-#include "Utils/Os/Linux/Thread.h"
 
 namespace host {
 

@@ -8,7 +8,7 @@
 #include <system_error>
 
 #include "Framework/Classes/CimBroker.h"
-#include "Framework/Classes/InstanceLifetime.h"
+#include "Framework/Classes/InstanceList.h"
 #include "Host/Daemon/Report.h"
 #include "Host/Operations/Dispatcher.h"
 #include "Host/Operations/InteropNamespace.h"

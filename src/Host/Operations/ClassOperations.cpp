@@ -149,7 +149,7 @@ IntrinsicResult enumerateClassNames(const OperationContext& context, const Param
 
 IntrinsicResult getQualifier(const OperationContext&, const Parameters& parameters) {
     const std::string name = parameters.text("QualifierName");
-    const core::QualifierDeclaration* declaration = core::findQualifierDeclaration(name);
+    const core::QualifierDeclaration* declaration = core::findByName(core::qualifierDeclarations(), name);
     if (declaration == nullptr)
         throw core::CimError(core::CimStatus::NotFound, "no qualifier \"" + name + "\"");
     return {.kind = ResultKind::Qualifiers, .qualifiers = {*declaration}};

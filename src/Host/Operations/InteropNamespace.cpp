@@ -82,9 +82,9 @@ void InteropNamespace::relocate(CimPath& path) const {
 void InteropNamespace::relocate(InstanceValue& instance) const {
     relocate(instance.path);
     for (core::PropertyValue& property : instance.properties) {
-        auto* scalar = std::get_if<CimScalar>(&property.value.data);
-        auto* reference = scalar == nullptr ? nullptr : std::get_if<CimPath>(scalar);
-        if (reference != nullptr) relocate(*reference);
+        property.value.forEach([this](CimScalar& scalar) {
+            if (auto* reference = std::get_if<CimPath>(&scalar)) relocate(*reference);
+        });
     }
 }
 

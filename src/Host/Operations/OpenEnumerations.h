@@ -8,7 +8,6 @@
 #include "CimXml/Response.h"
 #include "Host/Settings.h"
 #include "Utils/Os/Linux/Mutex.h"
-#include "Utils/Os/Linux/Thread.h"
 
 namespace host {
 

@@ -11,9 +11,7 @@
 #include "Host/Authentication/Authentication.h"
 #include "Host/Settings.h"
 
-struct MHD_Connection;
 struct MHD_Daemon;
-struct MHD_Response;
 
 namespace host {
 

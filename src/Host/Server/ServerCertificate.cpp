@@ -1,7 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Host/Server/ServerCertificate.h"
 
-#include <algorithm>
 #include <array>
 #include <cerrno>
 #include <cstdint>

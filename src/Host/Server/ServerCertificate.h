@@ -3,7 +3,6 @@
 
 #include <gnutls/abstract.h>
 
-#include <memory>
 #include <string>
 
 #include "Host/Settings.h"

@@ -12,7 +12,6 @@
 #include "Providers/SoftwareUpdate/AdapterClaim.h"
 #include "Utils/FirmwareTypes.h"
 #include "Utils/Os/Linux/Mutex.h"
-#include "Utils/Os/Linux/Thread.h"
 #include "Utils/Time.h"
 
 class JobThread;

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Providers/SoftwareUpdate/Quenx_ConcreteJobClass.h"
 
-#include "Framework/Classes/InstanceLifetime.h"
+#include "Framework/Classes/RequestScope.h"
 #include "Providers/SoftwareUpdate/MethodResults.h"
 
 namespace {

@@ -3,7 +3,7 @@
 
 #include <algorithm>
 
-#include "Framework/Classes/InstanceLifetime.h"
+#include "Framework/Classes/RequestScope.h"
 #include "Providers/SoftwareUpdate/MethodArguments.h"
 #include "Providers/SoftwareUpdate/Quenx_ConcreteJobClass.h"
 #include "Utils/Os/Linux/linux.h"
@@ -59,10 +59,6 @@ std::optional<unsigned int> checkTargetAndCollection(const MethodArguments& in, 
     return std::nullopt;
 }
 
-bool isSuccess(unsigned int returnValue) {
-    return returnValue == MethodReturn::JobStarted || returnValue == MethodReturn::Completed;
-}
-
 /// Completes the order and has the registry carry it out; onSuccess receives the job. Whatever the registry
 /// or onSuccess throws is answered by "not enough memory".
 template <class OnSuccess>
@@ -77,7 +73,7 @@ unsigned int carryOut(const MethodKind& kind, const core::CimPath* source, const
         const int result = registry.verifyOrCreateNewJob(order.adapterName, order.uri, order.options,
                                                          order.values, job, kind.createsJob);
         const unsigned int returnValue = returnValueOf(kind, result, targetText);
-        if (isSuccess(returnValue)) onSuccess(job);
+        if (returnValue == MethodReturn::JobStarted || returnValue == MethodReturn::Completed) onSuccess(job);
         return returnValue;
     } catch (...) {
         QUENX_DEBUG("Allocation error occured for '%s'", targetText.c_str());

@@ -2,8 +2,8 @@
 #include <gtest/gtest.h>
 
 #include "Framework/Classes/CimBroker.h"
-#include "Framework/Classes/InstanceLifetime.h"
 #include "Framework/Classes/InstanceList.h"
+#include "Framework/Classes/RequestScope.h"
 #include "Providers/SoftwareUpdate/UpdateTest.h"
 #include "Utils/Os/Linux/linux.h"
 

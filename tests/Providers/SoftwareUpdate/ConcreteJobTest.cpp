@@ -3,7 +3,7 @@
 
 #include <gtest/gtest.h>
 
-#include "Framework/Classes/InstanceLifetime.h"
+#include "Framework/Classes/InstanceList.h"
 #include "Providers/SoftwareUpdate/MethodResults.h"
 #include "Providers/SoftwareUpdate/Quenx_ConcreteJobClass.h"
 #include "Providers/SoftwareUpdate/UpdateTest.h"

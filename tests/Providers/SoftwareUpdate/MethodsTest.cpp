@@ -3,7 +3,7 @@
 #include <gtest/gtest.h>
 
 #include "Framework/Classes/CimBroker.h"
-#include "Framework/Classes/InstanceLifetime.h"
+#include "Framework/Classes/RequestScope.h"
 #include "MidAPI/Image/RomFormat.h"
 #include "Providers/Schema/ProviderInterfaces.h"
 #include "Providers/SoftwareUpdate/UpdateTest.h"

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Providers/SoftwareUpdate/UpdateTest.h"
 
-#include "Framework/Classes/InstanceLifetime.h"
+#include "Framework/Classes/InstanceList.h"
 #include "Support/TestRoms.h"
 
 namespace test {

@@ -1,18 +1,39 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include <atomic>
 #include <memory>
 #include <vector>
 
 #include "Utils/Export.h"
 
-/// How long instances live: at least as long as the requests that have met them, and until the reaper has
-/// destroyed them.
+/// What keeps providers and their instances alive while somebody uses them.
 namespace core {
 
-class AgentUse;
-class CimInstance;
-struct AgentRegistration;
+class CimAgent;
+
+/// One agent's entry with the broker; counts the requests that use the agent.
+struct AgentRegistration {
+    CimAgent* agent = nullptr;
+    std::atomic<int> users{0};
+};
+
+/// Keeps an agent from leaving while it lives. Movable, not copyable.
+class QUENX_EXPORT AgentUse {
+  public:
+    explicit AgentUse(std::shared_ptr<AgentRegistration> registration) noexcept;
+    AgentUse(AgentUse&&) noexcept = default;
+    AgentUse& operator=(AgentUse&&) = delete;
+    ~AgentUse();
+
+    CimAgent& agent() const { return *m_registration->agent; }
+    bool uses(const std::shared_ptr<AgentRegistration>& registration) const {
+        return m_registration == registration;
+    }
+
+  private:
+    std::shared_ptr<AgentRegistration> m_registration;
+};
 
 /// One request of a client, on the calling thread. Whatever is enumerated, looked up or added meanwhile on
 /// this thread stays alive until the scope ends, so plain pointers to instances are good that long. The
@@ -38,21 +59,5 @@ class QUENX_EXPORT RequestScope {
     std::vector<std::shared_ptr<const void>> m_held;
     std::vector<AgentUse> m_agents;
 };
-
-/// The deleter of listed instances: destroys one that nobody holds any more, at once, or on the reaper's
-/// thread when the instance's destructor waits. Never fails and never waits; where that thread cannot be had,
-/// the instance stays queued until the next one comes, or drainReaper().
-struct InstanceRelease {
-    void operator()(CimInstance* instance) const noexcept;
-};
-
-/// Makes sure that the reaper is built, and so destroyed after the object that is being built now.
-void prepareReaper();
-
-/// Returns when every instance that was queued is destroyed, code of its library included.
-QUENX_EXPORT void drainReaper() noexcept;
-
-/// Whether the thread still has instances to destroy.
-QUENX_EXPORT bool isReaperBusy() noexcept;
 
 }  // namespace core
