@@ -79,12 +79,11 @@ TEST(CimPathTest, ReadsBackTheTextThatItWrites) {
 }
 
 TEST(CimPathTest, KeepsATextThatDoesNotParseAndNamesNothing) {
+    using namespace std::string_literals;
     for (const std::string& text :
-         {std::string(), std::string("."), std::string("1Class"), std::string("Class."),
-          std::string("Class.Key="), std::string("Class.Key=\"open"), std::string("Class.Key=\"end\\"),
-          std::string("Class.Key=\"a\"x"), std::string("Class.Key=\"a\","), std::string("Class.A=1,a=2"),
-          std::string("//host"), std::string("Class.Key=word"), std::string("a b:c d.e=\"f\""),
-          std::string("Class.K=\"a\0b\"\0", 15)}) {
+         {""s, "."s, "1Class"s, "Class."s, "Class.Key="s, "Class.Key=\"open"s, "Class.Key=\"end\\"s,
+          "Class.Key=\"a\"x"s, "Class.Key=\"a\","s, "Class.A=1,a=2"s, "//host"s, "Class.Key=word"s,
+          "a b:c d.e=\"f\""s, "Class.K=\"a\0b\"\0"s}) {
         const CimPath path(text);
         EXPECT_FALSE(path.isValid()) << text;
         EXPECT_EQ(path.toString(), text);

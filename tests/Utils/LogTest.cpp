@@ -97,9 +97,6 @@ TEST(LogTest, AddsABacktraceToErrorsWithSymbolsFromLevelTwo) {
         EXPECT_TRUE(lines[1].text.starts_with("  Backtrace: ")) << lines[1].text;
         EXPECT_EQ(lines.size() > 2, level == 2);
     }
-    SyslogCapture::clear();
-    utils::logBacktrace(LOG_ERR, -1, true);
-    EXPECT_TRUE(SyslogCapture::lines().empty());
 }
 
 TEST(LogTest, EvaluatesOnlyWhatIsWrittenAndLetsNothingOut) {

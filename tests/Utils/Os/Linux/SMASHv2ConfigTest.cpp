@@ -33,7 +33,6 @@ TEST_F(SMASHv2ConfigTest, ReadsAndLogsEachLine) {
         {"namespace=root/x", "root/cimv2", 300000, nullptr},
         {"  # Namespace=root/x", "root/cimv2", 300000, nullptr},
         {"\tNamespace==root/x=y z", "root/x", 300000, "Read NameSpace : root/x"},
-        {"Namespace=%n%s", "root/cimv2", 300000, nullptr},
         {"Timeout=0x1F4", "root/cimv2", 500, "Read LockerTimeout : 500"},
         {"Timeout 42 43", "root/cimv2", 42, "Read LockerTimeout : 42"},
         {"Timeout=0xFFFFFFFF", "root/cimv2", 4294967295U, "Read LockerTimeout : -1"},
