@@ -61,6 +61,8 @@ TEST(AdapterDescriptionTest, NamesMistakesWithPlaceAndRemedy) {
         {"\na = 3\"\xD2\x82", "a.toml, line 2: a character beyond ASCII"},
         {"a = 1 # \xC3\xA4\n\xC3\xA4 = 1",
          "line 2: a character beyond ASCII stands outside a text in quotes"},
+        {"a = 0x[''P'\xC3\xA4", "a.toml, line 1: a character beyond ASCII"},
+        {"a = 6-[[\"\xC3\xA4", "a.toml, line 1: a character beyond ASCII"},
         {"a = [[1\n\xEF\xB7\xB6]]", "a.toml, line 2: a character beyond ASCII"},
         {"a = '\\' \xC3\xA4", "a.toml, line 1: a character beyond ASCII"},
         {"a = \"\"\"b\"\"\"\"\"\n\xC3\xA4", "a.toml, line 2: a character beyond ASCII"},

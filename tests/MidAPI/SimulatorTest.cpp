@@ -191,4 +191,21 @@ TEST(BackendTest, IsChosenByCallThenEnvironment) {
     ma::setBackend(mine);
 }
 
+TEST(BackendTest, AnswersUntilTheProcessHasEnded) {
+    // As a provider that is still loaded then: its destructor waits for the flash that runs.
+    const auto provider = [] {
+        if (ma::enumerateAdapters().size() != 5 || !install("eth0", test::madeRom({{PXE, 9}})).done)
+            ::_exit(1);
+    };
+    const test::TempFolder folder;
+    const std::string description = folder.write("adapters.toml", test::kTestAdapters);
+    EXPECT_EXIT(
+        {
+            std::atexit(provider);
+            ma::configureSimulator(description, folder / "state");
+            std::exit(0);
+        },
+        testing::ExitedWithCode(0), "");
+}
+
 }  // namespace

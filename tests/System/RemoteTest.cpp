@@ -7,7 +7,6 @@
 #include <set>
 #include <sstream>
 
-#include "Cli/Connection/Connection.h"
 #include "System/HeldFlash.h"
 #include "System/Quenxctl.h"
 #include "System/RunningDaemon.h"
@@ -131,25 +130,6 @@ TEST_F(RemoteTest, ShowsTheSameModelAsInProcess) {
     }
     expectError(walk + " --class No_Such", 4, "No class \"No_Such\" is served.");
     expectError("instances No_<&>\"Such", 4, "No_<&>\"Such");
-}
-
-TEST_F(RemoteTest, AnswersOperationsThatNoVerbNeeds) {
-    cli::ServerSettings settings;
-    settings.url.emplace(m_plainUrl);
-    settings.user = "admin";
-    const cli::Connection connection = cli::openServer(settings, [] { return false; });
-    core::CimOperations& server = *connection.operations;
-    const core::CimPath port = server.enumerateInstanceNames("Quenx_EthernetPort").at(0);
-    const core::AssociationFilter byFirmware{"Quenx_ElementSoftwareIdentity", "", "", ""};
-    EXPECT_EQ(server.referenceNames(port, byFirmware).size(), 2U);
-    const auto links = server.references(port, byFirmware, {{"Antecedent"}});
-    ASSERT_EQ(links.size(), 2U);
-    EXPECT_EQ(links[0].properties.size(), 1U);
-    EXPECT_EQ(server.getInstance(port, {{"Name"}}).properties.size(), 1U);
-    EXPECT_EQ(server.getClass("quenx_ethernetport").back()->name, "CIM_ManagedElement");
-    EXPECT_TRUE(server.getClass("No_Such").empty());
-    EXPECT_EQ(server.enumerateClasses("Quenx_EthernetPort", true).size(), 0U);
-    EXPECT_THROW(server.enumerateClasses("No_Such", true), core::CimError);
 }
 
 TEST_F(RemoteTest, RefusesWhomItCannotTrust) {
