@@ -1,4 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
+#include <unistd.h>
+
 #include <filesystem>
 #include <nlohmann/json.hpp>
 #include <regex>
@@ -30,6 +32,28 @@ class InventoryTest : public test::Quenxctl {
         return "no id with " + part;
     }
 };
+
+TEST_F(InventoryTest, TellsAnOrdinaryUserWhatOnlyRootMaySee) {
+    if (::geteuid() != 0) GTEST_SKIP() << "needs root, to become another user";
+    EXPECT_EQ(quenxctl("install --target eth0 IMAGE").status, 0);
+    std::filesystem::permissions(m_folder.path(), std::filesystem::perms(0755));
+    const auto asNobody = [this](const std::string& line) {
+        std::vector<std::string> words{"/usr/bin/setpriv", "--reuid=65534", "--regid=65534",
+                                       "--clear-groups"};
+        const std::vector<std::string> program = command(line);
+        words.insert(words.end(), program.begin(), program.end());
+        return test::run(words);
+    };
+    const std::string said = "The firmware of eth0 cannot be read. Run quenxctl as root, ";
+    const test::ProgramResult listed = asNobody("adapters");
+    EXPECT_EQ(listed.status, 0);
+    EXPECT_TRUE(contains(listed.error, said)) << listed.error;
+    EXPECT_TRUE(contains(listed.out, "eth1") && contains(listed.out, "IMG_PXE 1")) << listed.out;
+    const test::ProgramResult checked = asNobody("check --target eth0 IMAGE");
+    EXPECT_EQ(checked.status, 1);
+    EXPECT_TRUE(contains(checked.error, "The firmware of eth0 cannot be read.\nRun quenxctl as root, "))
+        << checked.error;
+}
 
 TEST_F(InventoryTest, ChangesNothingByACheckAndInstallsByIdentity) {
     const std::string table = quenxctl("identities").out;

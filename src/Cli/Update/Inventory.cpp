@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Cli/Update/Inventory.h"
 
+#include <unistd.h>
+
 #include <algorithm>
 #include <filesystem>
 
@@ -74,7 +76,7 @@ std::string componentsText(const std::vector<Component>& components) {
 void to_json(Json& json, const Adapter& adapter) {
     json = {{"name", adapter.name}, {"description", adapter.description}, {"pciAddress", adapter.pciAddress},
             {"ids", adapter.ids},   {"updatable", adapter.updatable},     {"components", adapter.components},
-            {"path", adapter.path}};
+            {"path", adapter.path}, {"answers", adapter.answers}};
 }
 
 std::vector<Component> readComponents(core::CimOperations& operations, const core::CimPath& port) {
@@ -98,8 +100,18 @@ std::vector<Adapter> readAdapters(core::CimOperations& operations) {
                             identifyingText(port, "PCI Vendor and Device ID"),
                             !core::sameName(identifyingText(port, "Firmware Update"), "Not Supported"),
                             readComponents(operations, port.path)});
+        // Unknown to the provider, and not merely not told.
+        const bool isUnknown = port.get<std::uint64_t>("EnabledState") == 0U;
+        adapters.back().answers = !isUnknown || !adapters.back().components.empty();
     }
     return adapters;
+}
+
+std::string adviceForSilence(const Connection& connection) {
+    if (!connection.isInProcess || ::geteuid() == 0) return "The system log has the reason.";
+    // What was written to a simulated adapter is for the eyes of the user who wrote it.
+    return "Run quenxctl as root, as whom alone you may see what root has written; the system log has the "
+           "reason.";
 }
 
 std::string adviceForNoAdapters(const Connection& connection) {

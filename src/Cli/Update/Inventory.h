@@ -37,6 +37,7 @@ struct Adapter {
     std::string ids;  ///< "1af4:1041"; empty when not shown
     bool updatable = true;
     std::vector<Component> components;  ///< what is installed, as far as it is shown
+    bool answers = true;                ///< false when nothing can be read from it
 };
 void to_json(nlohmann::ordered_json& json, const Adapter& adapter);
 
@@ -45,6 +46,9 @@ std::vector<Adapter> readAdapters(core::CimOperations& operations);
 
 /// What is installed on a port.
 std::vector<Component> readComponents(core::CimOperations& operations, const core::CimPath& port);
+
+/// What to do about adapters that do not answer.
+std::string adviceForSilence(const Connection& connection);
 
 /// What to do where there are no adapters; empty for a server, which has its own.
 std::string adviceForNoAdapters(const Connection& connection);

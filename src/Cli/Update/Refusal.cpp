@@ -205,7 +205,9 @@ Reason explainNotApplicable(const Candidate& candidate) {
 Reason explainImage(const Connection& connection, std::uint32_t returnValue, const Candidate& candidate) {
     switch (returnValue) {
         case MethodReturn::UnspecifiedError:
-            return explainFile(candidate);
+            if (candidate.adapter.answers) return explainFile(candidate);
+            return Explanation{"The firmware of " + candidate.adapter.name + " cannot be read.",
+                               adviceForSilence(connection)};
         case MethodReturn::InvalidParameter:
             return connection.isInProcess ? explainFile(candidate) : explainServersFile(candidate);
         case MethodReturn::UnsupportedTargetType:

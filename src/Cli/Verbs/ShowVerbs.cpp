@@ -68,12 +68,19 @@ ExitStatus showAdapters(Context& context, const VerbOptions&) {
     }
     std::vector<std::vector<std::string>> rows = {
         {"NAME", "PCI", "IDS", "UPDATABLE", "FIRMWARE", "DESCRIPTION"}};
+    std::vector<std::string> silent;
     for (const Adapter& adapter : adapters) {
+        const std::string firmware = !adapter.answers             ? "?"
+                                     : adapter.components.empty() ? "-"
+                                                                  : componentsText(adapter.components);
         rows.push_back({adapter.name, adapter.pciAddress, adapter.ids, adapter.updatable ? "yes" : "no",
-                        adapter.components.empty() ? "-" : componentsText(adapter.components),
-                        adapter.description});
+                        firmware, adapter.description});
+        if (!adapter.answers) silent.push_back(adapter.name);
     }
     printTable(context.out, rows);
+    if (!silent.empty())
+        context.error << "The firmware of " << printable(joined(silent)) << " cannot be read. "
+                      << adviceForSilence(context.connection) << '\n';
     return ExitStatus::Done;
 }
 
