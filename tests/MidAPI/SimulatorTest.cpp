@@ -84,7 +84,8 @@ TEST(SimulatorTest, SurvivesDamageWhereABankIsLeftAndNamesItWhereNot) {
     EXPECT_TRUE(install("eth0", test::madeRom({{PXE, 4}})).done) << "into the damaged bank";
     EXPECT_EQ("IMG_PXE 4, IMG_UEFI 0", test::componentsOf("eth0"));
 
-    adapters.folder().write("state/eth0/state", "no record");
+    for (const char* file : {"state", "state.copy", "bank-0.rom", "bank-1.rom"})
+        adapters.folder().write(std::string("state/eth0/") + file, "no record");
     EXPECT_THROW(test::componentsOf("eth0"), ma::AdapterError);
     EXPECT_EQ(6, test::prepareImage("eth0", test::madeRom({{PXE, 5}})).status);
     EXPECT_EQ("IMG_PXE 1, IMG_UEFI 0", test::componentsOf("eth1"));

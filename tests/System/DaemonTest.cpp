@@ -308,7 +308,7 @@ TEST(DaemonTest, NamesWhatKeepsItFromServing) {
         std::vector<std::string> options;
         std::string said;
     } table[] = {
-        {1, {held, free}, "process " + std::to_string(daemon.program().id()) + " holds "},
+        {1, {held, free}, "process " + std::to_string(daemon.program().id()) + " (quenx-cimd) holds "},
         {1, {lock, taken}, "127.0.0.1 port " + port + ": Address already in use. Stop the program that"},
         // The lock is free again.
         {1, {lock, free, "--providers-directory=/nonexistent"}, "/nonexistent"},

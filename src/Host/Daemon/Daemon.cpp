@@ -48,8 +48,7 @@ const std::string& withItsFolder(const std::string& path) {
 
 }  // namespace
 
-LockFile::LockFile(const std::string& path) try
-    : m_path(path), m_lock(withItsFolder(path), os::FileLock::Mode::Try) {
+LockFile::LockFile(const std::string& path) try : m_path(path), m_lock(withItsFolder(path)) {
 } catch (const std::system_error& error) {
     throw std::runtime_error("Cannot write the lock file " + path + ": " + error.code().message() + ". " +
                              (error.code().value() == EACCES
@@ -59,11 +58,8 @@ LockFile::LockFile(const std::string& path) try
 
 void LockFile::require() const {
     if (isHeld()) return;
-    const pid_t holder = m_lock.holder();
-    // A daemon that has just taken the lock has not left its number yet.
-    throw std::runtime_error("quenx-cimd is already running: " +
-                             (holder == 0 ? "another process" : "process " + std::to_string(holder)) +
-                             " holds " + m_path + ". Stop it, or set daemon.lock_file to another file.");
+    throw std::runtime_error("quenx-cimd is already running: " + m_lock.holder() + " holds " + m_path +
+                             ". Stop it, or set daemon.lock_file to another file.");
 }
 
 void loadProviders(core::ProviderLibraries& providers, const std::string& directory) {

@@ -7,7 +7,7 @@
 #include "Framework/Requests/ProviderSession.h"
 #include "Host/Server/HttpServer.h"
 #include "Host/Settings.h"
-#include "Utils/Os/Linux/linux.h"
+#include "Utils/Os/Linux/FileLock.h"
 
 namespace host {
 

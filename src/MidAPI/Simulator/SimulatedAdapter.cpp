@@ -1,8 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "MidAPI/Simulator/SimulatedAdapter.h"
 
-#include <unistd.h>
-
 #include <chrono>
 #include <stdexcept>
 #include <system_error>
@@ -16,18 +14,6 @@
 
 namespace ma {
 namespace {
-
-std::uint32_t bitOf(utils::FirmwareType type) {
-    const auto number = static_cast<std::uint32_t>(type);
-    return number >= 1 && number <= 5 ? 1U << number : 0;
-}
-
-std::uint32_t bitsOf(const std::vector<utils::FirmwareVersionInfo>& components) {
-    std::uint32_t bits = 0;
-    for (const utils::FirmwareVersionInfo& component : components)
-        bits |= bitOf(component.type);
-    return bits;
-}
 
 /// The folder of an adapter: its name, where only letters, digits, _ and - stand for themselves. Names come
 /// from a description; "../x" must not leave the state directory, nor may two names share a folder.
@@ -90,7 +76,7 @@ std::vector<std::uint8_t> makeFactoryFlash(const AdapterDescription& adapter) {
 FlashState factoryState(const AdapterDescription& description, std::span<const std::uint8_t> flash) {
     FlashState state;
     state.bootType = static_cast<std::uint32_t>(description.bootType);
-    if (!flash.empty()) state.capabilityWord = bitsOf(parseOptionRom(flash).components());
+    if (!flash.empty()) state.capabilityWord = capabilityBits(parseOptionRom(flash).components());
     return state;
 }
 
@@ -100,15 +86,6 @@ FlashStore makeStore(const AdapterDescription& description, const std::string& s
     const FlashState state = factoryState(description, flash);
     return FlashStore(stateDirectory + "/" + folderName(description.name), std::move(flash), state,
                       std::move(files));
-}
-
-/// Who is busy, in words: "busy" alone leaves an administrator to search.
-std::string describeHolder(const std::string& adapter, pid_t holder) {
-    std::string text = "adapter " + adapter + " is being written to by ";
-    if (holder == 0) return text + "another process; wait until it is done";
-    if (holder == ::getpid())
-        return text + "this process (" + std::to_string(holder) + "); wait until it is done";
-    return text + "process " + std::to_string(holder) + "; wait until it is done";
 }
 
 /// Runs an operation and turns what it throws into the API's code and text. AdapterError, which faults throw,
@@ -254,7 +231,9 @@ bool SimulatedAdapter::write(std::span<const std::uint8_t> image, std::uint32_t&
         requireWritable(image);
         const os::FileLock lock = m_store.lockForWriting();
         if (!lock.isHeld())
-            throw OperationFailure(WriteError::Busy, describeHolder(m_description.name, lock.holder()));
+            throw OperationFailure(WriteError::Busy, "adapter " + m_description.name +
+                                                         " is being written to by " + lock.holder() +
+                                                         "; wait until it is done");
         writeLocked(image);
     });
 }
@@ -285,9 +264,9 @@ bool SimulatedAdapter::updateCapabilityWord(const std::vector<utils::FirmwareTyp
         FaultRun(m_faults, Operation::CapabilityWord).reach();
         std::uint32_t wanted = 0;
         for (const utils::FirmwareType type : types)
-            wanted |= bitOf(type);
+            wanted |= capabilityBit(type);
         // Bits of images that an update took away would let a BIOS look for what is not there.
-        const std::uint32_t held = bitsOf(components());
+        const std::uint32_t held = capabilityBits(components());
         m_store.changeState(
             [&](FlashState& state) { state.capabilityWord = (state.capabilityWord | wanted) & held; });
     });

@@ -4,7 +4,6 @@
 #include <dirent.h>
 #include <fcntl.h>
 #include <limits.h>
-#include <sys/file.h>
 #include <sys/stat.h>
 #include <sys/time.h>
 #include <unistd.h>
@@ -52,10 +51,6 @@ int readUpTo(const Descriptor& file, std::span<std::uint8_t> buffer, std::size_t
 
 [[noreturn]] void failToOpen(const std::string& path) {
     throw utils::Exception(utils::formatStr("Could not open the file %s", path.c_str()));
-}
-
-[[noreturn]] void failToLock(const std::string& path) {
-    throw std::system_error(errno, std::generic_category(), "cannot lock " + path);
 }
 
 }  // namespace
@@ -141,36 +136,6 @@ utils::StringArray listDirectory(const std::string& path) {
     // The system's order changes with every file that comes or goes.
     std::sort(names.begin(), names.end());
     return names;
-}
-
-FileLock::FileLock(const std::string& path, Mode mode)
-    : m_file(::open(path.c_str(), O_RDWR | O_CREAT | O_CLOEXEC | O_NOFOLLOW, 0644)) {
-    if (m_file.number() < 0) failToLock(path);
-    int result;
-    do {
-        result = ::flock(m_file.number(), mode == Mode::Wait ? LOCK_EX : LOCK_EX | LOCK_NB);
-    } while (result != 0 && errno == EINTR);
-    m_held = result == 0;
-    if (!m_held && errno != EWOULDBLOCK) failToLock(path);
-    if (m_held) leaveProcessId();
-}
-
-FileLock::~FileLock() {
-    // Emptied before it is free again, so that nobody reads the id of a process that is done.
-    if (m_held && ::ftruncate(m_file.number(), 0) != 0) errno = 0;
-}
-
-pid_t FileLock::holder() const {
-    char text[16] = {};
-    if (::pread(m_file.number(), text, sizeof text - 1, 0) <= 0) return 0;
-    return static_cast<pid_t>(std::strtol(text, nullptr, 10));
-}
-
-void FileLock::leaveProcessId() const {
-    // Only told to people: without it the lock is as good.
-    const std::string text = std::to_string(::getpid()) + "\n";
-    if (::ftruncate(m_file.number(), 0) != 0 || ::pwrite(m_file.number(), text.data(), text.size(), 0) < 0)
-        errno = 0;
 }
 
 }  // namespace os

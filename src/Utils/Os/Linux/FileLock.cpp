@@ -1,0 +1,129 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "Utils/Os/Linux/FileLock.h"
+
+#include <fcntl.h>
+#include <sys/file.h>
+#include <sys/stat.h>
+#include <sys/sysmacros.h>
+
+#include <cerrno>
+#include <cstdio>
+#include <cstdlib>
+#include <sstream>
+#include <system_error>
+
+#include "Utils/Os/Linux/Thread.h"
+#include "Utils/Utils.h"
+
+namespace os {
+
+namespace {
+
+constexpr mode_t kOwnerOnly = S_IRUSR | S_IWUSR;
+constexpr unsigned int kPoll = 5;  // ms
+
+[[noreturn]] void fail(const std::string& path, int error) {
+    throw std::system_error(error, std::generic_category(), "cannot lock " + path);
+}
+
+/// Writing the holder's number must not change a file that only bears this name, too; and nobody else may
+/// open, and so lock, the file.
+void requireOwnFile(int file, const std::string& path) {
+    struct stat status {};
+    if (::fstat(file, &status) != 0) fail(path, errno);
+    if (!S_ISREG(status.st_mode)) fail(path, EINVAL);
+    if (status.st_nlink > 1) fail(path, EMLINK);
+    const bool isOpenToOthers = (status.st_mode & (S_IRWXG | S_IRWXO)) != 0;
+    if (isOpenToOthers && status.st_uid == ::geteuid() && ::fchmod(file, kOwnerOnly) != 0) fail(path, errno);
+}
+
+/// flock has no time-out, so it is asked again and again. Returns 0, or the errno value.
+int lockWithin(int file, std::chrono::milliseconds patience) {
+    const auto end = std::chrono::steady_clock::now() + patience;
+    while (::flock(file, LOCK_EX | LOCK_NB) != 0) {
+        if (errno != EWOULDBLOCK && errno != EINTR) return errno;
+        if (std::chrono::steady_clock::now() >= end) return EWOULDBLOCK;
+        utils::Thread::msleep(kPoll);
+    }
+    return 0;
+}
+
+/// The first `most` bytes of a file of the system's, as text; empty when it cannot be read.
+std::string readText(const std::string& path, std::size_t most) {
+    try {
+        const auto bytes = readWholeFile(path, most);
+        return bytes ? std::string(bytes->begin(), bytes->end()) : "";
+    } catch (const std::system_error&) {
+        return "";
+    }
+}
+
+/// What the program of a process is called: " (quenxctl)".
+std::string programOf(pid_t process) {
+    constexpr std::size_t kMaxName = 15;
+    std::string name;
+    // Anybody can give a program any name, and this one goes to logs and terminals.
+    for (const char character : readText("/proc/" + std::to_string(process) + "/comm", kMaxName))
+        if (character > ' ' && character <= '~') name += character;
+    return name.empty() ? "" : " (" + name + ")";
+}
+
+}  // namespace
+
+FileLock::FileLock(const std::string& path, std::chrono::milliseconds patience)
+    : m_file(::open(path.c_str(), O_RDWR | O_CREAT | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY,
+                    kOwnerOnly)) {
+    if (m_file.number() < 0) fail(path, errno);
+    requireOwnFile(m_file.number(), path);
+    const int error = lockWithin(m_file.number(), patience);
+    m_held = error == 0;
+    if (!m_held && error != EWOULDBLOCK) fail(path, error);
+    if (m_held) leaveProcessId();
+}
+
+FileLock::~FileLock() {
+    // Emptied before it is free again, so that nobody reads the id of a process that is done.
+    if (m_held && ::ftruncate(m_file.number(), 0) != 0) errno = 0;
+}
+
+std::string FileLock::holder() const {
+    const pid_t process = holdingProcess();
+    if (process <= 0) return "another process";
+    if (process == ::getpid()) return "this process (" + std::to_string(process) + ")";
+    return "process " + std::to_string(process) + programOf(process);
+}
+
+pid_t FileLock::holdingProcess() const {
+    constexpr std::size_t kMaxLocks = std::size_t{1} << 20;
+    struct stat status {};
+    if (::fstat(m_file.number(), &status) != 0) return 0;
+    // The kernel knows better than the file, which a holder of another kind leaves as it was. Some file
+    // systems have a device number of their own in its list: the inode then has to do.
+    pid_t sameInode = 0;
+    std::istringstream locks(readText("/proc/locks", kMaxLocks));
+    for (std::string line; std::getline(locks, line);) {
+        int process = 0;
+        unsigned int major = 0;
+        unsigned int minor = 0;
+        unsigned long long inode = 0;
+        if (std::sscanf(line.c_str(), "%*d: FLOCK %*s %*s %d %x:%x:%llu", &process, &major, &minor, &inode) !=
+                4 ||
+            inode != status.st_ino)
+            continue;
+        if (makedev(major, minor) == status.st_dev) return process;
+        sameInode = process;
+    }
+    if (sameInode > 0) return sameInode;
+    char text[16] = {};
+    if (::pread(m_file.number(), text, sizeof text - 1, 0) <= 0) return 0;
+    return static_cast<pid_t>(std::strtol(text, nullptr, 10));
+}
+
+void FileLock::leaveProcessId() const {
+    // Only told to people: without it the lock is as good.
+    const std::string text = std::to_string(::getpid()) + "\n";
+    if (::ftruncate(m_file.number(), 0) != 0 || ::pwrite(m_file.number(), text.data(), text.size(), 0) < 0)
+        errno = 0;
+}
+
+}  // namespace os

@@ -1,0 +1,170 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "MidAPI/Simulator/FlashStore.h"
+
+#include <gtest/gtest.h>
+#include <sys/stat.h>
+
+#include <filesystem>
+#include <functional>
+
+#include "MidAPI/ma.h"
+#include "Support/SimulatedAdapters.h"
+#include "Support/SyslogCapture.h"
+#include "Support/TestRoms.h"
+
+namespace {
+
+namespace fs = std::filesystem;
+using Bytes = std::vector<std::uint8_t>;
+using enum utils::FirmwareType;
+
+class FlashStoreTest : public testing::Test {
+  protected:
+    std::string path(const std::string& file) const { return m_adapters.stateDirectory() + "/eth0/" + file; }
+    void write(const std::string& file, const Bytes& bytes) const {
+        m_adapters.folder().write("state/eth0/" + file, std::span(bytes));
+    }
+    static void writeRevision(std::uint16_t revision) {
+        EXPECT_TRUE(test::writeImage("eth0", test::madeRom({{PXE, revision}})).done);
+    }
+    /// What the adapter boots after its power was off and on.
+    std::string afterRestart() {
+        m_adapters.restart();
+        return test::componentsOf("eth0");
+    }
+    static mode_t modeOf(const std::string& file) {
+        struct stat status {};
+        EXPECT_EQ(::stat(file.c_str(), &status), 0) << file;
+        return status.st_mode & 07777;
+    }
+
+    test::SimulatedAdapters m_adapters;
+};
+
+TEST_F(FlashStoreTest, BootsTheNewImageWhateverHappensToItsRecord) {
+    const test::LogLevelGuard errors(1);
+    writeRevision(2);
+    writeRevision(3);
+    const Bytes record = test::readTestFile(path("state"));
+    ASSERT_EQ(record, test::readTestFile(path("state.copy")));
+    const fs::path active =
+        path(m_adapters->flashState("eth0").activeBank == 0 ? "bank-0.rom" : "bank-1.rom");
+    fs::last_write_time(active, fs::last_write_time(active) + std::chrono::seconds(1));
+
+    std::vector<std::pair<std::string, std::function<void(const std::string&)>>> damages = {
+        {"is missing", [&](const std::string& file) { fs::remove(path(file)); }},
+        {"is damaged",
+         [&](const std::string& file) {
+             fs::remove(path(file));
+             fs::create_directory(path(file));
+         }},
+    };
+    for (std::size_t i = 0; i < record.size(); ++i) {
+        Bytes wrong = record;
+        wrong[i] ^= 0x10;
+        for (const Bytes& bytes : {wrong, Bytes(record.begin(), record.begin() + static_cast<long>(i))})
+            damages.emplace_back("is damaged", [=, this](const std::string& file) { write(file, bytes); });
+    }
+    const std::string copyIsUsed = "; its copy is used";
+    const std::string isMadeAnew = ", its copy is no better; it is made anew from the banks, and boots ";
+    for (std::size_t i = 0; i < damages.size(); ++i) {
+        const auto& [said, damage] = damages[i];
+        for (const bool both : {false, true}) {
+            SCOPED_TRACE("damage " + std::to_string(i) + (both ? " to both" : " to the record"));
+            damage("state");
+            if (both) damage("state.copy");
+            test::SyslogCapture::clear();
+            EXPECT_EQ(afterRestart(), "IMG_PXE 3, IMG_UEFI 0");
+            EXPECT_EQ(test::componentsOf("eth0"), "IMG_PXE 3, IMG_UEFI 0");
+            EXPECT_EQ(test::SyslogCapture::count(path("state") + " " + said +
+                                                 (both ? isMadeAnew + active.string() : copyIsUsed)),
+                      1U);
+            for (const char* file : {"state", "state.copy"}) {
+                fs::remove_all(path(file));
+                write(file, record);
+            }
+        }
+    }
+}
+
+TEST_F(FlashStoreTest, MendsARecordMadeFromTheBanksAtTheNextChange) {
+    for (std::uint16_t revision = 2; revision < 4; ++revision) {
+        writeRevision(revision);
+        for (const char* file : {"state", "state.copy"})
+            write(file, {});
+        EXPECT_EQ(m_adapters->flashState("eth0").capabilityWord, 0b11000U);
+    }
+    // A version that keeps no copy leaves one behind that names what is no longer there.
+    writeRevision(4);
+    const Bytes stale = test::readTestFile(path("state.copy"));
+    writeRevision(5);
+    writeRevision(6);
+    write("state.copy", stale);
+    write("state", {});
+    const std::string found = afterRestart();
+    EXPECT_TRUE(found == "IMG_PXE 5, IMG_UEFI 0" || found == "IMG_PXE 6, IMG_UEFI 0") << found;
+}
+
+TEST_F(FlashStoreTest, ReadsAndKeepsTheLayoutOfRecordedFiles) {
+    const Bytes recorded = test::readTestFile(QUENX_MIDAPI_TEST_DIR "/samples/record-1");
+    fs::create_directories(path(""));
+    write("state", recorded);
+    const ma::FlashState state = m_adapters->flashState("eth0");
+    EXPECT_EQ(state.generation, 2U);
+    EXPECT_EQ(state.activeBank, 1);
+    EXPECT_EQ(state.banks[0].length, 2048U);
+    EXPECT_EQ(state.banks[1].length, 249344U);
+    EXPECT_EQ(state.banks[1].checksum, 0x81de21f3U);
+    EXPECT_EQ(state.capabilityWord, 0b11000U);
+
+    ASSERT_TRUE(ma::setBootType("eth0", ma::BootType::iSCSI));
+    Bytes expected = recorded;
+    expected[8] = 3;   // the generation
+    expected[32] = 2;  // the boot type
+    const Bytes written = test::readTestFile(path("state"));
+    EXPECT_EQ(Bytes(written.begin(), written.begin() + 40), Bytes(expected.begin(), expected.begin() + 40));
+    EXPECT_EQ(written.size(), recorded.size());
+}
+
+/// Nobody's patience lasts for half a minute in a test.
+class ImpatientFiles : public test::UnsyncedFiles {
+  public:
+    std::chrono::milliseconds patience() const override { return std::chrono::milliseconds(20); }
+};
+
+TEST_F(FlashStoreTest, GivesUpOnARecordThatSomebodyHoldsAndSaysWho) {
+    fs::create_directories(path(""));
+    const os::FileLock held(path("state.lock"));
+    const auto impatient =
+        std::make_shared<ma::Simulator>(ma::parseAdapterDescriptions(test::kTestAdapters, ""),
+                                        m_adapters.stateDirectory(), std::make_shared<ImpatientFiles>());
+    const auto patient = ma::setBackend(impatient);
+    const test::WriteResult result = test::writeImage("eth0", test::madeRom({{PXE, 2}}));
+    EXPECT_EQ(result.code, ma::WriteError::Busy);
+    EXPECT_TRUE(result.text.starts_with("this process (" + std::to_string(::getpid()) + ") holds " +
+                                        path("state.lock")))
+        << result.text;
+    EXPECT_EQ(test::componentsOf("eth0"), "IMG_PXE 1, IMG_UEFI 0");
+    EXPECT_TRUE(test::writeImage("eth1", test::madeRom({{PXE, 2}})).done) << "another adapter is free";
+    ma::setBackend(patient);
+}
+
+TEST_F(FlashStoreTest, ClosesItsFilesToOtherUsers) {
+    writeRevision(2);
+    EXPECT_EQ(modeOf(path("")), 0700U);
+    for (const char* file : {"state", "state.copy", "state.lock", "flash.lock", "bank-0.rom", "bank-1.rom"})
+        EXPECT_EQ(modeOf(path(file)), 0600U) << file;
+    // As an older version has left them.
+    ASSERT_EQ(::chmod(path("").c_str(), 0755), 0);
+    ASSERT_EQ(::chmod(path("state.lock").c_str(), 0644), 0);
+    writeRevision(3);
+    EXPECT_EQ(modeOf(path("")), 0700U);
+    EXPECT_EQ(modeOf(path("state.lock")), 0600U);
+
+    fs::rename(path(""), m_adapters.folder() / "elsewhere");
+    fs::create_symlink(m_adapters.folder() / "elsewhere", m_adapters.stateDirectory() + "/eth0");
+    EXPECT_EQ(test::writeImage("eth0", test::madeRom({{PXE, 4}})).code, ma::WriteError::DeviceFailed);
+    EXPECT_EQ(test::componentsOf("eth0"), "IMG_PXE 3, IMG_UEFI 0");
+}
+
+}  // namespace

@@ -1,0 +1,71 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "Utils/Os/Linux/FileLock.h"
+
+#include <fcntl.h>
+#include <gtest/gtest.h>
+#include <sys/file.h>
+#include <sys/stat.h>
+#include <sys/wait.h>
+
+#include <csignal>
+#include <filesystem>
+#include <system_error>
+
+#include "Support/TempFolder.h"
+
+namespace {
+
+TEST(FileLockTest, TellsWhoHoldsIt) {
+    const test::TempFolder folder;
+    const std::string path = folder / "lock";
+    const os::FileLock first(path);
+    EXPECT_TRUE(first.isHeld());
+    const os::FileLock second(path, std::chrono::milliseconds(20));
+    EXPECT_FALSE(second.isHeld());
+    EXPECT_EQ(second.holder(), "this process (" + std::to_string(::getpid()) + ")");
+
+    // Another program's lock, which leaves no number in the file.
+    const std::string other = folder.write("other", "");
+    int ready[2];
+    ASSERT_EQ(::pipe(ready), 0);
+    const pid_t child = ::fork();
+    if (child == 0) {
+        const int file = ::open(other.c_str(), O_RDONLY);
+        ::flock(file, LOCK_SH);
+        (void)!::write(ready[1], "x", 1);
+        for (;;)
+            ::pause();
+    }
+    char byte = 0;
+    ASSERT_EQ(::read(ready[0], &byte, 1), 1);
+    const os::FileLock refused(other);
+    EXPECT_FALSE(refused.isHeld());
+    EXPECT_TRUE(refused.holder().starts_with("process " + std::to_string(child) + " (")) << refused.holder();
+    ::kill(child, SIGKILL);
+    ::waitpid(child, nullptr, 0);
+    EXPECT_TRUE(os::FileLock(other, std::chrono::seconds(30)).isHeld());
+}
+
+TEST(FileLockTest, TakesOnlyAFileThatIsItsUsersOwn) {
+    const test::TempFolder folder;
+    const std::string precious = folder.write("precious", "content");
+    std::filesystem::create_symlink(precious, folder / "link");
+    std::filesystem::create_symlink(folder / "new", folder / "dangling");
+    std::filesystem::create_hard_link(precious, folder / "second-name");
+    ASSERT_EQ(::mkfifo((folder / "fifo").c_str(), 0600), 0);
+    for (const char* name : {"link", "dangling", "second-name", "fifo", "."})
+        EXPECT_THROW(os::FileLock(folder / name), std::system_error) << name;
+    EXPECT_EQ(test::readTestFile(precious).size(), 7U);
+    EXPECT_FALSE(std::filesystem::exists(folder / "new"));
+
+    const std::string old = folder.write("old", "");
+    ASSERT_EQ(::chmod(old.c_str(), 0644), 0);
+    const mode_t mask = ::umask(0);
+    const os::FileLock tightened(old);
+    const os::FileLock made(folder / "made");
+    ::umask(mask);
+    for (const char* name : {"old", "made"})
+        EXPECT_EQ(std::filesystem::status(folder / name).permissions(), std::filesystem::perms(0600)) << name;
+}
+
+}  // namespace
