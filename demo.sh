@@ -83,6 +83,7 @@ daemon="$PWD/build/release/bin/quenx-cimd"
 cat >"$scratch/quenx-cimd.toml" <<EOF
 [listen]
 https_port = 0
+socket = ""
 [tls]
 certificate = "$scratch/cert.pem"
 key = "$scratch/key.pem"

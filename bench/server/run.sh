@@ -46,6 +46,7 @@ cat >"$scratch/quenx-cimd.toml" <<EOF
 https_port = 0
 http = true
 http_port = 0
+socket = ""
 [tls]
 certificate = "$scratch/cert.pem"
 key = "$scratch/key.pem"

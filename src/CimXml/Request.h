@@ -11,6 +11,9 @@
 
 namespace cimxml {
 
+/// The Unix socket on which the object manager of this machine serves root, unless told otherwise.
+inline constexpr const char* kDefaultSocket = "/run/quenx-cimd/socket";
+
 /// A class, named where an operation takes a class or an instance.
 struct ClassName {
     std::string name;

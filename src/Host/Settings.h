@@ -7,6 +7,8 @@
 #include <string>
 #include <vector>
 
+#include "CimXml/Request.h"
+
 namespace host {
 
 /// Everything that bounds what clients can make the daemon spend. All have options.
@@ -35,6 +37,7 @@ struct ListenSettings {
     std::uint16_t httpPort = 5988;
     bool https = true;
     bool http = false;  ///< plain, for loopback and tests; passwords travel readable
+    std::string socket = cimxml::kDefaultSocket;  ///< a Unix socket, for this machine's root; empty: none
 };
 
 struct TlsSettings {

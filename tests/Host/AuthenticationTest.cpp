@@ -1,16 +1,35 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Host/Authentication/Authentication.h"
 
+#include <arpa/inet.h>
+#include <crypt.h>
+#include <dlfcn.h>
 #include <gmock/gmock.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
 #include <algorithm>
 #include <atomic>
+#include <cerrno>
 #include <ctime>
 #include <thread>
 
+#include "Host/Authentication/ClientAddress.h"
 #include "Support/TempFolder.h"
+
+namespace {
+
+std::atomic<bool> isMemoryShort{false};
+
+}  // namespace
+
+/// Stands before the library's, which does the work as long as there is memory.
+extern "C" char* crypt_r(const char* phrase, const char* setting, crypt_data* data) noexcept {
+    static const auto real = reinterpret_cast<decltype(&crypt_r)>(::dlsym(RTLD_NEXT, "crypt_r"));
+    if (!isMemoryShort) return real(phrase, setting, data);
+    errno = ENOMEM;
+    return nullptr;
+}
 
 namespace {
 
@@ -45,6 +64,9 @@ TEST(UsersFileTest, ChecksPasswords) {
     const std::clock_t known = std::max(cost({"admin", "guest"}), cost({"admin", ""}));
     EXPECT_GT(cost({"nobody", odd}) * 10, known);
     EXPECT_GT(cost({"", ""}) * 10, known);
+    isMemoryShort = true;
+    EXPECT_THROW(users.check({"guest", "guest"}, ""), host::CheckFailed) << "that is no wrong password";
+    isMemoryShort = false;
 }
 
 TEST(UsersFileTest, SaysWhatIsWrongWithAFile) {
@@ -75,31 +97,43 @@ TEST(UsersFileTest, SaysWhatIsWrongWithAFile) {
 }
 
 TEST(FailureDelaysTest, GrowWithFailures) {
-    host::FailureDelays delays;
+    host::FailureDelays delays(100ms, 2s);
     auto now = std::chrono::steady_clock::now();
-    const auto waitOf = [&](const std::string& address) {
-        const auto turn = delays.admit(address, now);
-        return turn ? std::chrono::duration_cast<std::chrono::milliseconds>(*turn - now) : -1ms;
+    const auto waitOf = [&](const std::string& place) {
+        return std::chrono::duration_cast<std::chrono::milliseconds>(std::max(delays.nextOf(place), now) -
+                                                                     now);
     };
-    EXPECT_EQ(waitOf("192.0.2.1"), 0ms);
-    for (const auto expected : {100ms, 200ms, 400ms, 800ms, 1600ms, 3200ms, 5000ms, 5000ms}) {
-        delays.failed("192.0.2.1", now);
-        EXPECT_EQ(waitOf("192.0.2.1"), expected);
+    for (const auto expected : {100ms, 200ms, 400ms, 800ms, 1600ms, 2000ms, 2000ms}) {
+        delays.failed("a", now);
+        EXPECT_EQ(waitOf("a"), expected);
         now += 20s;
     }
-    EXPECT_EQ(waitOf("192.0.2.2"), 0ms);
-    // Attempts at the same time take turns, and too many of them are not waited for.
-    for (const auto expected : {0ms, 5000ms, 10000ms, -1ms})
-        EXPECT_EQ(waitOf("192.0.2.1"), expected);
-    delays.succeeded("192.0.2.1");
-    EXPECT_EQ(waitOf("192.0.2.1"), 0ms);
-
-    delays.failed("2001:db8::1", now);
-    EXPECT_EQ(waitOf("2001:db8::2"), 100ms);  // the same network
-    EXPECT_EQ(waitOf("2001:db8:1::1"), 0ms);
+    EXPECT_EQ(waitOf("b"), 0ms);
+    // The next one waits, however this ends.
+    delays.admitted("a", now);
+    EXPECT_EQ(waitOf("a"), 2000ms);
+    delays.succeeded("a");
+    EXPECT_EQ(waitOf("a"), 0ms);
+    delays.failed("a", now);
     now += 16min;
-    delays.failed("192.0.2.9", now);
-    EXPECT_EQ(waitOf("2001:db8::1"), 0ms);  // forgotten
+    delays.failed("b", now);
+    EXPECT_EQ(delays.lastOf("a"), host::FailureDelays::Clock::time_point::min()) << "forgotten";
+}
+
+TEST(ClientAddressTest, CountsAsOneWhatOneMachineHas) {
+    const std::pair<const char*, const char*> table[] = {
+        {"192.0.2.1", "192.0.2.1"},          {"127.0.0.1", "loopback"},
+        {"127.255.0.9", "loopback"},         {"::1", "loopback"},
+        {"2001:db8::1", "2001:db8::/64"},    {"2001:db8::ffff:1:2", "2001:db8::/64"},
+        {"2001:db8:1::1", "2001:db8:1::/64"}};
+    for (const auto& [address, place] : table)
+        EXPECT_EQ(host::placeOf(address), place);
+    EXPECT_EQ(host::networkOf("127.0.0.2"), "127.0.0.2");
+    // As a socket shows it that serves both families.
+    sockaddr_in6 mapped{};
+    mapped.sin6_family = AF_INET6;
+    ASSERT_EQ(::inet_pton(AF_INET6, "::ffff:192.0.2.1", &mapped.sin6_addr), 1);
+    EXPECT_EQ(host::addressText(reinterpret_cast<const sockaddr&>(mapped)), "192.0.2.1");
 }
 
 /// Knows one password, and counts how often it is asked.
@@ -118,14 +152,32 @@ class CountingChecker : public host::PasswordChecker {
 
 class AuthenticationTest : public ::testing::Test {
   protected:
-    AuthenticationOutcome outcome(const char* header, const std::string& address = "192.0.2.1") {
-        return m_authentication->authenticate(header, address).outcome;
+    AuthenticationOutcome outcome(const char* header, const std::string& address = "192.0.2.1",
+                                  const std::stop_token& ended = {}) {
+        return m_authentication->authenticate(header, address, ended).outcome;
+    }
+    void start(std::chrono::milliseconds delay, std::chrono::milliseconds leastAnswer) {
+        m_authentication.emplace(std::make_unique<CountingChecker>(m_asked), 0s,
+                                 host::LoginPace{delay, delay, delay, leastAnswer, 60s});
+    }
+    /// The same attempt all the time, by several at once, until the end of the scope.
+    std::vector<std::jthread> crowd(const char* header, int size) {
+        std::vector<std::jthread> threads;
+        for (int i = 0; i < size; ++i) {
+            threads.emplace_back([this, header](const std::stop_token& stop) {
+                while (!stop.stop_requested())
+                    EXPECT_NE(outcome(header, "192.0.2.1", stop), AuthenticationOutcome::Accepted);
+            });
+        }
+        return threads;
     }
 
     // As clients write them, with blanks and without the "=" at the end: "admin" and "\xC3\xBC:x".
     const char* const m_right = "basic   YWRtaW46w7w6eA ";
     // "admin\xC3\xBC" and ":x": the same bytes, divided elsewhere.
     const char* const m_wrong = "Basic YWRtaW7DvDo6eA==";
+    // Right for the user whose password the one above guesses.
+    const char* const m_guessed = "Basic YWRtaW7DvDrDvDp4";
     const char* const m_stranger = "Basic c3RyYW5nZXI6w7w6eA==";
     std::atomic<int> m_asked{0};
     std::optional<host::Authentication> m_authentication{std::in_place,
@@ -150,29 +202,56 @@ TEST_F(AuthenticationTest, AsksOnceForRightCredentials) {
     EXPECT_EQ(m_asked, 5);
 }
 
-TEST_F(AuthenticationTest, MakesWrongCredentialsWaitAndNobodyElse) {
-    m_authentication.emplace(std::make_unique<CountingChecker>(m_asked), 0s);
+TEST_F(AuthenticationTest, LetsACrowdThatGuessesKeepNobodyOut) {
+    constexpr int kCrowd = 12;
+    start(100ms, 0ms);
     EXPECT_EQ(outcome(m_right), AuthenticationOutcome::Accepted);
-    const auto start = std::chrono::steady_clock::now();
-    for (int i = 0; i < 3; ++i)
-        EXPECT_EQ(outcome(m_wrong), AuthenticationOutcome::Wrong);
-    EXPECT_GE(std::chrono::steady_clock::now() - start, 300ms);
+    m_authentication->reload();
+    const auto guessers = crowd(m_wrong, kCrowd);
+    while (m_asked < 3)
+        std::this_thread::sleep_for(1ms);
+    // Behind all of the crowd there would be as many checks before it.
+    const auto checksBefore = [&](const char* header, const char* address, AuthenticationOutcome expected) {
+        const int before = m_asked;
+        EXPECT_EQ(outcome(header, address), expected);
+        return m_asked - before;
+    };
+    EXPECT_LT(checksBefore(m_right, "192.0.2.1", AuthenticationOutcome::Accepted), kCrowd) << "known";
+    EXPECT_LT(checksBefore(m_guessed, "192.0.2.2", AuthenticationOutcome::Accepted), kCrowd) << "elsewhere";
+    // In its midst, a newcomer waits for his turn, and gets it.
+    checksBefore(m_stranger, "192.0.2.1", AuthenticationOutcome::Forbidden);
+}
 
-    // Attempts from the address queue up, until one would have to wait for too long.
-    std::atomic<int> refused{0};
-    std::vector<std::thread> waiting;
-    while (refused == 0) {
-        waiting.emplace_back([&] {
-            if (outcome(m_wrong) == AuthenticationOutcome::Busy) ++refused;
-        });
-    }
-    EXPECT_EQ(outcome(m_right), AuthenticationOutcome::Accepted);  // it was right before
-    EXPECT_EQ(outcome(m_stranger, "192.0.2.2"), AuthenticationOutcome::Forbidden);
-    const int before = refused;
-    m_authentication->stop();
-    for (std::thread& each : waiting)
-        each.join();
-    EXPECT_GT(refused, before) << "the stop lets go of those who wait";
+TEST_F(AuthenticationTest, DelaysGuessesByPlaceAndByUser) {
+    start(300ms, 0ms);
+    const auto timeOf = [&](const char* header, const char* address) {
+        const auto begin = std::chrono::steady_clock::now();
+        outcome(header, address);
+        return std::chrono::steady_clock::now() - begin;
+    };
+    EXPECT_EQ(outcome(m_wrong, "127.0.0.1"), AuthenticationOutcome::Wrong);
+    EXPECT_GE(timeOf(m_stranger, "127.0.0.2"), 250ms) << "another address of loopback";
+    EXPECT_EQ(outcome(m_wrong, "192.0.2.1"), AuthenticationOutcome::Wrong);
+    EXPECT_GE(timeOf(m_guessed, "192.0.2.2"), 250ms) << "another place, the same user";
+}
+
+TEST_F(AuthenticationTest, AnswersEveryFailureAfterTheSameTime) {
+    start(0ms, 200ms);
+    const auto begin = std::chrono::steady_clock::now();
+    EXPECT_EQ(outcome(m_wrong), AuthenticationOutcome::Wrong);
+    EXPECT_GE(std::chrono::steady_clock::now() - begin, 200ms) << "though the check took no time";
+    // Those who wait for the answer are in nobody's way.
+    start(0ms, 1h);
+    const auto waiting = crowd(m_wrong, 5);
+    while (m_asked < 6)
+        std::this_thread::sleep_for(1ms);
+    EXPECT_EQ(outcome(m_right), AuthenticationOutcome::Accepted);
+
+    host::LoginQueue queue({.leastAnswer = 100ms});
+    EXPECT_EQ(queue.answerAfter(1ms), 100ms);
+    EXPECT_EQ(queue.answerAfter(150ms), 300ms);
+    EXPECT_EQ(queue.answerAfter(1ms), 300ms) << "as long for a user who is unknown, on a slow machine too";
+    EXPECT_EQ(queue.answerAfter(10s), 800ms);
 }
 
 }  // namespace

@@ -167,6 +167,9 @@ TEST(ConfigCheckTest, LooksAtEveryFile) {
         {2, folder / "none", folder / "none", {}},
         {2, certificate, key, {"--listen-address", "192.0.2.1"}},
         {2, certificate, key, {"--daemon-lock-file", "/nonexistent/lock"}},
+        {2, certificate, key, {"--listen-socket", "/nonexistent/socket"}},
+        {2, certificate, key, {"--listen-socket", junk}},
+        {0, certificate, key, {"--listen-socket", folder / "socket"}},
         {2, certificate, key, {"--auth-method", "users", "--auth-users-file", "/nonexistent"}},
         {2, certificate, key, {"--providers-configuration", "/nonexistent"}},
         {2, certificate, key, {"--adapters-description", "/nonexistent", "--adapters-state", "/tmp"}},
@@ -181,7 +184,8 @@ TEST(ConfigCheckTest, LooksAtEveryFile) {
         {2, key, key, {}},
     };
     for (const auto& row : table) {
-        const std::string config = "[daemon]\nlock_file = '" + (folder / "lock") + "'\n";
+        const std::string config =
+            "[listen]\nsocket = ''\n[daemon]\nlock_file = '" + (folder / "lock") + "'\n";
         Words arguments{"--config", folder.write("config", config), "--listen-https-port", "0"};
         arguments.insert(arguments.end(), {"--tls-certificate", row.certificate, "--tls-key", row.key});
         arguments.insert(arguments.end(), row.more.begin(), row.more.end());

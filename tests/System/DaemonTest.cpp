@@ -249,9 +249,10 @@ TEST(DaemonTest, RunsWhereItIsInstalled) {
     ASSERT_EQ(installed.status, 0) << installed.error;
     const std::string prefix = place / "staged/new/prefix";
     const std::string daemon = prefix + "/sbin/quenx-cimd";
-    const std::string config =
-        place.write("config", "[listen]\nhttps = false\nhttp = true\nhttp_port = 0\n[daemon]\nlock_file = '" +
-                                  (place / "lock") + "'\n");
+    const std::string config = place.write(
+        "config",
+        "[listen]\nhttps = false\nhttp = true\nhttp_port = 0\nsocket = ''\n[daemon]\nlock_file = '" +
+            (place / "lock") + "'\n");
     const ProgramResult checked = test::run({daemon, "--check-config", "--config", config});
     EXPECT_EQ(checked.status, 0) << checked.error;
     EXPECT_EQ(test::run({prefix + "/bin/quenxctl", "mof"}).status, 0);
@@ -317,8 +318,9 @@ TEST(DaemonTest, NamesWhatKeepsItFromServing) {
         {0, {held, taken, "--check-config"}, ""},
     };
     for (const auto& row : table) {
-        std::vector<std::string> command{QUENX_CIMD, "--config", folder.write("empty", ""),
-                                         "--listen-https=false", "--listen-http"};
+        std::vector<std::string> command{
+            QUENX_CIMD,        "--config", folder.write("empty", ""), "--listen-https=false", "--listen-http",
+            "--listen-socket", ""};
         command.insert(command.end(), row.options.begin(), row.options.end());
         const ProgramResult result = test::run(command);
         EXPECT_EQ(result.status, row.status) << result.error;

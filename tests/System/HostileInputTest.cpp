@@ -32,7 +32,8 @@ class HostileInputTest : public ::testing::Test {
   protected:
     HostileInputTest()
         : m_daemon({"--limits-header-seconds", "3", "--limits-request-seconds", "4", "--limits-idle-seconds",
-                    "3", "--limits-connections", "200", "--limits-connections-per-address", "100"}),
+                    "3", "--limits-connections", "200", "--limits-connections-per-address", "100"},
+                   {"QUENX_LOG=stderr"}),
           m_goodClient([this](const std::stop_token& stop) { goOnAsking(stop); }) {}
 
     void goOnAsking(const std::stop_token& stop) {
@@ -52,7 +53,9 @@ class HostileInputTest : public ::testing::Test {
         std::sort(m_times.begin(), m_times.end());
         const auto p99 =
             std::chrono::duration_cast<std::chrono::milliseconds>(m_times[(m_times.size() - 1) * 99 / 100]);
-        EXPECT_EQ(m_daemon.stop().status, 0);
+        const test::ProgramResult result = m_daemon.stop();
+        EXPECT_EQ(result.status, 0);
+        EXPECT_LT(result.out.size(), 100000U) << "a flood must not fill the log";
         rusage usage{};
         ::getrusage(RUSAGE_CHILDREN, &usage);
         std::cout << "a good client had " << m_times.size() << " answers, p99 " << p99.count()
@@ -95,6 +98,21 @@ TEST_F(HostileInputTest, ClosesConnectionsThatSendTooSlowly) {
         EXPECT_EQ(connection.receive(), "");
     shortBody.receive();
     noEnd.receive();
+}
+
+TEST_F(HostileInputTest, DropsSilentConnectionsForNewOnes) {
+    std::list<RawConnection> silent;
+    for (int i = 0; i < 600; ++i)
+        silent.emplace_back(m_daemon.httpPort(), ("127.0.0." + std::to_string(10 + i % 5)).c_str());
+    // Both one of the crowd and somebody new get in.
+    for (const char* address : {"127.0.0.10", "127.0.0.20"}) {
+        const RawConnection connection(m_daemon.httpPort(), address);
+        connection.send(m_request);
+        EXPECT_EQ(statusOf(connection.receive()), 200) << address;
+    }
+    EXPECT_TRUE(
+        m_daemon.program().waitFor("limits.connections (200) reached: closed a connection that has not "));
+    EXPECT_EQ(silent.front().receive(), "");
 }
 
 TEST_F(HostileInputTest, RefusesWhatIsTooLarge) {

@@ -7,15 +7,15 @@
 #include <mutex>
 
 #include "Framework/Model/CimType.h"
+#include "Host/Authentication/ClientAddress.h"
 #include "Utils/Log.h"
 
 namespace host {
 
 namespace {
 
-/// Password hashes are made to be costly, so a flood of them is kept to a part of the processors.
-constexpr unsigned int kChecksAtATime = 2;
-constexpr std::chrono::seconds kWaitForCheck{10};
+/// No name is longer, and an attacker's must not fill the memory.
+constexpr std::size_t kLongestName = 64;
 
 /// The bytes of a base64 text (RFC 4648 4), with or without padding; nothing for any other text.
 std::optional<std::string> decodeBase64(std::string text) {
@@ -47,66 +47,68 @@ std::optional<Credentials> readBasicHeader(std::string_view header) {
     return Credentials{decoded->substr(0, colon), decoded->substr(colon + 1)};
 }
 
+void waitUntil(std::chrono::steady_clock::time_point time, const std::stop_token& stop) {
+    std::mutex mutex;
+    std::condition_variable_any timeCame;  // nobody calls it: only the time or the stop ends the wait
+    std::unique_lock lock(mutex);
+    timeCame.wait_until(lock, stop, time, [] { return false; });
+}
+
 }  // namespace
 
-Authentication::Authentication(std::unique_ptr<PasswordChecker> checker, std::chrono::seconds rememberFor)
-    : m_checker(std::move(checker)), m_cache(rememberFor), m_checks(kChecksAtATime) {}
+Authentication::Authentication(std::unique_ptr<PasswordChecker> checker, std::chrono::seconds rememberFor,
+                               const LoginPace& pace)
+    : m_checker(std::move(checker)), m_cache(rememberFor), m_queue(pace) {}
 
 AuthenticationResult Authentication::authenticate(const std::optional<std::string>& header,
-                                                  const std::string& address) {
+                                                  const std::string& address, const std::stop_token& ended) {
     const auto credentials = header ? readBasicHeader(*header) : std::nullopt;
     if (!credentials) return {AuthenticationOutcome::Missing, {}};
-    const auto known = m_cache.find(*credentials, FailureDelays::keyOf(address));
-    // If somebody guesses passwords, other users of the same address must still get in.
-    if (!known && !waitForTurn(address)) return {AuthenticationOutcome::Busy, {}};
-    std::optional<User> user;
-    if (known && known->isFresh) {
-        user = known->user;
-    } else {
-        const HeldSlot check(m_checks, kWaitForCheck);
-        if (!check) return {AuthenticationOutcome::Busy, {}};
-        user = checkNow(*credentials, address);
+    std::optional<Checked> checked;
+    try {
+        checked = check(*credentials, address, ended);
+    } catch (const CheckFailed& error) {
+        QUENX_ERROR("cannot check a password: %s", error.what());
     }
-    if (!user) return {AuthenticationOutcome::Wrong, {}};
-    return {user->mayRead ? AuthenticationOutcome::Accepted : AuthenticationOutcome::Forbidden, *user};
+    if (!checked) return {AuthenticationOutcome::Busy, {}};
+    if (!checked->user) {
+        waitUntil(checked->mayBeTold, ended);
+        return {AuthenticationOutcome::Wrong, {}};
+    }
+    return {checked->user->mayRead ? AuthenticationOutcome::Accepted : AuthenticationOutcome::Forbidden,
+            *checked->user};
 }
 
-bool Authentication::waitForTurn(const std::string& address) {
-    const auto turn = m_delays.admit(address);
-    if (!turn) return false;
-    std::mutex mutex;
-    std::condition_variable_any turnCame;  // nobody calls it: only the time or the stop ends the wait
-    std::unique_lock lock(mutex);
-    turnCame.wait_until(lock, m_stop.get_token(), *turn, [] { return false; });
-    return !m_stop.stop_requested();
-}
-
-std::optional<User> Authentication::checkNow(const Credentials& credentials, const std::string& address) {
-    const std::string place = FailureDelays::keyOf(address);
+std::optional<Authentication::Checked> Authentication::check(const Credentials& credentials,
+                                                             const std::string& address,
+                                                             const std::stop_token& ended) {
+    const std::string place = placeOf(address);
+    auto known = m_cache.find(credentials, place);
+    if (known && known->isFresh) return Checked{known->user, {}};
+    const LoginQueue::Attempt attempt{credentials.user.substr(0, kLongestName), place, known.has_value()};
+    LoginQueue::Turn turn(m_queue, attempt, ended);
+    if (!turn) return std::nullopt;
     // Several requests may have come with the same credentials while the first of them was checked.
-    const auto known = m_cache.find(credentials, place);
-    if (known && known->isFresh) return known->user;
+    known = m_cache.find(credentials, place);
+    if (known && known->isFresh) return Checked{known->user, {}};
     const std::uint64_t generation = m_cache.generation();
+    const auto start = Clock::now();
     const std::optional<User> user = m_checker->check(credentials, address);
+    const auto mayBeTold = start + m_queue.answerAfter(Clock::now() - start);
     if (user) {
-        // One who did not have to wait says nothing about the others there.
-        if (!known) m_delays.succeeded(address);
+        turn.succeeded();
         m_cache.remember(credentials, place, *user, generation);
     } else {
         m_cache.forget(credentials, place);
-        m_delays.failed(address);
+        turn.failed();
         QUENX_ERROR("wrong user or password \"%s\" from %s", credentials.user.c_str(), address.c_str());
     }
-    return user;
+    return Checked{user, mayBeTold};
 }
 
 void Authentication::reload() {
     m_checker->reload();
-    m_cache.clear();
-}
-
-void Authentication::stop() {
-    m_stop.request_stop();
+    m_cache.expire();
 }
 
 }  // namespace host

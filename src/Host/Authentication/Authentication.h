@@ -11,6 +11,7 @@
 #include <stop_token>
 #include <string>
 
+#include "Host/Authentication/LoginQueue.h"
 #include "Host/Authentication/PasswordChecker.h"
 
 namespace host {
@@ -36,35 +37,6 @@ class HeldSlot {
     const bool m_isHeld;
 };
 
-/// Makes an address that has sent wrong passwords wait before the next one is looked at: a tenth of a second
-/// after the first failure, twice that after each further one, five seconds at the most. Its attempts take
-/// turns; one that would wait for more than ten seconds is not waited for. Addresses are forgotten a quarter
-/// of an hour after their last failure; those of one IPv6 network of 64 bits count as one. Thread-safe.
-class FailureDelays {
-  public:
-    using Clock = std::chrono::steady_clock;
-
-    /// When an attempt from the address may be looked at; nothing when it has to wait too long.
-    std::optional<Clock::time_point> admit(const std::string& address, Clock::time_point now = Clock::now());
-    void failed(const std::string& address, Clock::time_point now = Clock::now());
-    void succeeded(const std::string& address);
-
-    /// What counts as one place: an IPv4 address, or the network of an IPv6 one.
-    static std::string keyOf(const std::string& address);
-
-  private:
-    struct Record {
-        unsigned int failures = 0;
-        Clock::time_point next;  ///< when the next attempt may be looked at
-        Clock::time_point last;  ///< the last failure
-    };
-
-    static Clock::duration delayAfter(unsigned int failures);
-
-    utils::Mutex m_mutex;
-    std::map<std::string, Record> m_records QUENX_GUARDED_BY(m_mutex);
-};
-
 /// Remembers for a short while whose credentials were right, since checking a password costs tens of
 /// milliseconds and clients send it with every request; and for good which ones were, so that those need not
 /// wait with the ones that somebody guesses. Both hold for the place (the address) that they came from only,
@@ -83,14 +55,14 @@ class CredentialCache {
 
     /// Nothing when they were never right.
     std::optional<Known> find(const Credentials& credentials, const std::string& place);
-    /// How often everything was forgotten. To be asked before a check whose outcome is remembered: what was
-    /// found right by users that have been read anew since is not remembered.
+    /// How often everything expired. To be asked before a check whose outcome is remembered: what was found
+    /// right by users that have been read anew since is not remembered.
     std::uint64_t generation();
     void remember(const Credentials& credentials, const std::string& place, const User& user,
                   std::uint64_t generation);
     void forget(const Credentials& credentials, const std::string& place);
-    /// Forgets everything and takes a new key.
-    void clear();
+    /// The users were read anew: has all credentials checked once more, which does not make them unknown.
+    void expire();
 
   private:
     using Clock = std::chrono::steady_clock;
@@ -100,12 +72,12 @@ class CredentialCache {
         Clock::time_point expires;
     };
 
-    Digest digestOf(const Credentials& credentials, const std::string& place) const QUENX_REQUIRES(m_mutex);
+    Digest digestOf(const Credentials& credentials, const std::string& place) const;
 
     const std::chrono::seconds m_rememberFor;
     utils::Mutex m_mutex;
     std::uint64_t m_generation QUENX_GUARDED_BY(m_mutex) = 0;
-    Digest m_key QUENX_GUARDED_BY(m_mutex);
+    Digest m_key{};
     std::map<Digest, Entry> m_entries QUENX_GUARDED_BY(m_mutex);
 };
 
@@ -123,30 +95,34 @@ struct AuthenticationResult {
 };
 
 /// Who sends a request. Credentials verified a short while ago are accepted at once; others are checked, a
-/// few at a time, and attempts from an address that has sent wrong ones wait, but for credentials that were
-/// right before. The wait is the calling connection's own and takes nobody else's place. Thread-safe.
+/// few at a time and in the order of LoginQueue. The wait, and that for the answer to wrong ones, is the
+/// calling connection's own and takes nobody else's place. Thread-safe.
 class Authentication {
   public:
-    Authentication(std::unique_ptr<PasswordChecker> checker, std::chrono::seconds rememberFor);
+    Authentication(std::unique_ptr<PasswordChecker> checker, std::chrono::seconds rememberFor,
+                   const LoginPace& pace = {});
 
-    AuthenticationResult authenticate(const std::optional<std::string>& header, const std::string& address);
+    /// @param ended  the client does not wait any more, so nothing is waited for
+    AuthenticationResult authenticate(const std::optional<std::string>& header, const std::string& address,
+                                      const std::stop_token& ended = {});
 
-    /// Reads the users again and forgets verified credentials. Throws std::runtime_error when that fails; all
-    /// is then as before.
+    /// Reads the users again, and checks credentials verified before once more. Throws std::runtime_error
+    /// when the users cannot be read; all is then as before.
     void reload();
 
-    /// Releases everybody who waits; if somebody would wait from now on, they are refused.
-    void stop();
-
   private:
-    bool waitForTurn(const std::string& address);
-    std::optional<User> checkNow(const Credentials& credentials, const std::string& address);
+    using Clock = std::chrono::steady_clock;
+    struct Checked {
+        std::optional<User> user;
+        Clock::time_point mayBeTold;  ///< that it is wrong
+    };
+
+    std::optional<Checked> check(const Credentials& credentials, const std::string& address,
+                                 const std::stop_token& ended);
 
     std::unique_ptr<PasswordChecker> m_checker;
     CredentialCache m_cache;
-    FailureDelays m_delays;
-    Slots m_checks;
-    std::stop_source m_stop;
+    LoginQueue m_queue;
 };
 
 }  // namespace host

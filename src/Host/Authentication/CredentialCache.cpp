@@ -17,18 +17,16 @@ constexpr std::size_t kMaxEntries = 1024;
 }  // namespace
 
 CredentialCache::CredentialCache(std::chrono::seconds rememberFor) : m_rememberFor(rememberFor) {
-    clear();
-}
-
-void CredentialCache::clear() {
-    Digest key{};
-    if (::gnutls_rnd(GNUTLS_RND_KEY, key.data(), key.size()) != 0) {
+    if (::gnutls_rnd(GNUTLS_RND_KEY, m_key.data(), m_key.size()) != 0) {
         throw std::runtime_error("Cannot get random numbers for a key");
     }
+}
+
+void CredentialCache::expire() {
     const utils::Mutex::AutoLocker lock(m_mutex);
     ++m_generation;
-    m_key = key;
-    m_entries.clear();
+    for (auto& [digest, entry] : m_entries)
+        entry.expires = Clock::time_point::min();
 }
 
 std::uint64_t CredentialCache::generation() {

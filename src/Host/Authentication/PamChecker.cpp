@@ -58,6 +58,9 @@ class PamSession {
         if (m_status == PAM_SUCCESS) m_status = ::pam_authenticate(m_handle, kFlags);
         // Even if the password is right, the account may have expired or be locked.
         if (m_status == PAM_SUCCESS) m_status = ::pam_acct_mgmt(m_handle, kFlags);
+        // Not PAM_AUTHINFO_UNAVAIL, which may mean that the user is unknown: that must not be told.
+        if (m_status == PAM_BUF_ERR || m_status == PAM_SYSTEM_ERR || m_status == PAM_ABORT)
+            throw CheckFailed(::pam_strerror(m_handle, m_status));
         return m_status == PAM_SUCCESS;
     }
 

@@ -3,6 +3,7 @@
 
 #include <map>
 #include <optional>
+#include <stdexcept>
 #include <string>
 #include <vector>
 
@@ -23,6 +24,12 @@ struct User {
     bool mayRead = false;  ///< false: known, but not admitted
 };
 
+/// A password that could not be checked, which says nothing of whether it is right.
+class CheckFailed : public std::runtime_error {
+  public:
+    using std::runtime_error::runtime_error;
+};
+
 /// Knows whose password is right. Takes its time: tens of milliseconds and more. Thread-safe.
 class PasswordChecker {
   public:
@@ -31,7 +38,7 @@ class PasswordChecker {
     PasswordChecker& operator=(const PasswordChecker&) = delete;
     virtual ~PasswordChecker() = default;
 
-    /// Nothing for an unknown user as for a wrong password.
+    /// Nothing for an unknown user as for a wrong password. Throws CheckFailed.
     virtual std::optional<User> check(const Credentials& credentials, const std::string& address) = 0;
 
     /// Reads again what it keeps. Throws std::runtime_error, and then keeps what it had.

@@ -37,9 +37,13 @@ bool sameHash(std::string_view left, std::string_view right) {
 
 std::string crypted(const std::string& password, const std::string& setting) {
     const auto data = std::make_unique<crypt_data>();  // 32 KiB: too much for the stack of a thread
+    errno = 0;
     const char* hash = ::crypt_r(password.c_str(), setting.c_str(), data.get());
+    const bool isFailure = hash == nullptr || *hash == '*';
+    // Some methods take megabytes. Without them the right password would be called wrong.
+    if (isFailure && errno == ENOMEM) throw CheckFailed("no memory to hash it");
     // A failure token begins with an asterisk and equals no hash.
-    return hash == nullptr ? "*" : hash;
+    return isFailure ? "*" : hash;
 }
 
 UserEntry readEntry(const std::string& path, std::size_t number, const std::string& line, std::string& name) {

@@ -11,6 +11,7 @@
 #include "Host/Authentication/PasswordChecker.h"
 #include "Host/Daemon/CommandLine.h"
 #include "Host/Daemon/Daemon.h"
+#include "Host/Server/LocalSocket.h"
 #include "Host/Server/ServerCertificate.h"
 #include "MidAPI/Simulator/Simulator.h"
 #include "MidAPI/ma.h"
@@ -21,6 +22,10 @@ namespace host {
 namespace {
 
 namespace fs = std::filesystem;
+
+void warn(const std::string& text) {
+    if (!text.empty()) std::cerr << "quenx-cimd: Warning: " << text << '\n';
+}
 
 /// For a file that a start makes: whether it could be made, in the nearest folder that is there.
 void requireWritable(const std::string& file, const std::string& advice) {
@@ -34,27 +39,39 @@ void requireWritable(const std::string& file, const std::string& advice) {
         throw std::runtime_error("Cannot write " + file + ": " + std::strerror(error) + ". " + advice);
 }
 
+/// For a file of the folder that is made at the start, or of another one, which has to be there.
+void requireFolder(const std::string& file, const std::string& setting) {
+    if (isInDefaultFolder(file)) return requireWritable(file, "Run as root, or set " + setting + ".");
+    const fs::path directory = fs::absolute(file).parent_path();
+    if (fs::is_directory(directory)) return;
+    throw std::runtime_error(setting + " is " + file + ", but there is no directory " + directory.string() +
+                             ". Make it, or set " + setting + " to another file.");
+}
+
 /// Whether a daemon holds the lock file. Does not make it where it is missing.
 bool isDaemonRunning(const std::string& file) {
     if (fs::exists(file)) return !LockFile(file).isHeld();
-    const fs::path directory = fs::absolute(file).parent_path();
-    // The folder of the default is made at the start.
-    const bool isDefault = file == Settings().lockFile;
-    if (isDefault) requireWritable(file, "Run as root, or set daemon.lock_file.");
-    if (!isDefault && !fs::is_directory(directory)) {
-        throw std::runtime_error("daemon.lock_file is " + file + ", but there is no directory " +
-                                 directory.string() + ". Make it, or set daemon.lock_file to another file.");
-    }
+    requireFolder(file, "daemon.lock_file");
     return false;
 }
 
-void checkPort(const std::string& address, std::uint16_t port, bool isRestart) {
+/// For what can be listened on: unless the daemon that a start would replace does so already.
+void checkListening(const std::function<void()>& step, bool isRestart) {
     try {
-        const os::Descriptor listener(openListener(address, port));
+        step();
     } catch (const ListenError& error) {
-        // The daemon that this one would replace is likely the one that listens there.
         if (!isRestart || error.code() != EADDRINUSE) throw;
     }
+}
+
+void checkPort(const std::string& address, std::uint16_t port) {
+    const os::Descriptor listener(openListener(address, port));
+}
+
+void checkSocket(const std::string& path) {
+    if (path.empty()) return;
+    requireFolder(path, "listen.socket");
+    if (fs::is_directory(fs::absolute(path).parent_path())) LocalSocket::check(path);
 }
 
 void checkTls(const TlsSettings& settings) {
@@ -67,14 +84,13 @@ void checkTls(const TlsSettings& settings) {
 }
 
 void checkAuthentication(const AuthenticationSettings& settings) {
-    constexpr const char* kService = "/etc/pam.d/quenx-cimd";
+    const std::string service = "/etc/pam.d/quenx-cimd";
     if (settings.method == "users") {
         readUsersFile(settings.usersFile);
-    } else if (!fs::exists(kService)) {
+    } else if (!fs::exists(service)) {
         // It can work: "other" is strict on most systems, but whom it lets in is not this program's choice.
-        std::cerr << "quenx-cimd: Warning: " << kService
-                  << " does not exist, so PAM applies its service \"other\". "
-                  << "Copy the file from the installation.\n";
+        warn(service +
+             " does not exist, so PAM applies its service \"other\". Copy the file from the installation.");
     }
 }
 
@@ -117,8 +133,12 @@ int checkConfiguration(const Settings& settings) {
     // First, since a daemon that runs already excuses its ports.
     bool isRunning = false;
     check([&] { isRunning = isDaemonRunning(settings.lockFile); });
-    if (listen.https) check([&] { checkPort(listen.address, listen.httpsPort, isRunning); });
-    if (listen.http) check([&] { checkPort(listen.address, listen.httpPort, isRunning); });
+    const auto checkListener = [&](const std::function<void()>& step) {
+        check([&] { checkListening(step, isRunning); });
+    };
+    if (listen.https) checkListener([&] { checkPort(listen.address, listen.httpsPort); });
+    if (listen.http) checkListener([&] { checkPort(listen.address, listen.httpPort); });
+    checkListener([&] { checkSocket(listen.socket); });
     if (listen.https) check([&] { checkTls(settings.tls); });
     check([&] { checkAuthentication(settings.authentication); });
     check([&] { checkProviderConfiguration(settings.providerConfiguration); });

@@ -38,15 +38,21 @@ std::string runningUpdates(core::CimOperations& operations) {
     return text;
 }
 
-/// systemd makes the folder of the default lock file (RuntimeDirectory=); without it a start by hand does.
+/// systemd makes the folder of the default lock file and socket (RuntimeDirectory=); without it a start by
+/// hand does.
 const std::string& withItsFolder(const std::string& path) {
-    if (path == Settings().lockFile && ::mkdir(path.substr(0, path.rfind('/')).c_str(), S_IRWXU) != 0 &&
+    if (isInDefaultFolder(path) && ::mkdir(path.substr(0, path.rfind('/')).c_str(), S_IRWXU) != 0 &&
         errno != EEXIST)
         throw std::system_error(errno, std::generic_category());
     return path;
 }
 
 }  // namespace
+
+bool isInDefaultFolder(const std::string& path) {
+    const std::string file = Settings().lockFile;
+    return path.starts_with(file.substr(0, file.rfind('/') + 1)) && path.rfind('/') == file.rfind('/');
+}
 
 LockFile::LockFile(const std::string& path) try : m_path(path), m_lock(withItsFolder(path)) {
 } catch (const std::system_error& error) {
@@ -146,6 +152,10 @@ void Daemon::listen() {
         listenOn(m_settings.listen.httpsPort, true);
     }
     if (m_settings.listen.http) listenOn(m_settings.listen.httpPort, false);
+    if (!m_settings.listen.socket.empty()) {
+        m_server->listenLocally(withItsFolder(m_settings.listen.socket));
+        m_addresses += " unix:" + m_settings.listen.socket;
+    }
 }
 
 void Daemon::reload() {

@@ -11,6 +11,9 @@
 
 namespace host {
 
+/// Whether the file is in the folder of the default lock file and socket, which a start makes.
+bool isInDefaultFolder(const std::string& path);
+
 /// The lock that one daemon on the machine can hold; the file names its process. Given back when the process
 /// ends, however that is.
 class LockFile {
@@ -42,7 +45,7 @@ class Daemon {
     Daemon(const Daemon&) = delete;
     Daemon& operator=(const Daemon&) = delete;
 
-    /// Where it listens, for a person: "https://127.0.0.1:5989".
+    /// Where it listens, for a person: "https://127.0.0.1:5989 unix:/run/quenx-cimd/socket".
     const std::string& addresses() const { return m_addresses; }
 
     /// Reads certificate, key and users again, and reports what it has read. What cannot be read stays as it

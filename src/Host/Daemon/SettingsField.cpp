@@ -79,6 +79,8 @@ std::vector<SettingsField> fieldsOf(Settings& s) {
             {"listen.https_port", &s.listen.httpsPort, 0, 65535, "port for HTTPS; 0 picks a free one"},
             {"listen.http", &s.listen.http, 0, 0, "serve plain HTTP too; it sends passwords in clear text"},
             {"listen.http_port", &s.listen.httpPort, 0, 65535, "port for plain HTTP; 0 picks a free one"},
+            {"listen.socket", &s.listen.socket, 0, 0,
+             "Unix socket on which root of this machine is served without a password; empty for none"},
             {"tls.certificate", &s.tls.certificate, 0, 0, "file with the certificate chain (PEM)"},
             {"tls.key", &s.tls.key, 0, 0, "file with the private key (PEM)"},
             {"tls.generate", &s.tls.generate, 0, 0,

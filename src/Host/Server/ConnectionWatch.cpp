@@ -10,50 +10,76 @@ namespace {
 // Limits are whole seconds, so looking four times a second is exact enough and needs no queue of deadlines.
 constexpr std::chrono::milliseconds kTick{250};
 
-/// The connection's own thread sees the end and closes; closing here would let the number be used again.
-void end(int socket) {
-    ::shutdown(socket, SHUT_RDWR);
-}
-
 }  // namespace
 
-void ConnectionWatch::opened(int socket, Clock::duration allowed) {
+void ConnectionWatch::end(int socket, Watched& watched) {
+    watched.isEnded = true;
+    watched.waiting.request_stop();
+    // The connection's own thread sees the end and closes; closing here would let the number be used again.
+    if (watched.isStarted) ::shutdown(socket, SHUT_RDWR);
+}
+
+void ConnectionWatch::started(int socket) {
     const std::lock_guard lock(m_mutex);
-    m_watched[socket] = {Clock::now() + allowed, false};
+    const auto found = m_watched.find(socket);
+    if (found == m_watched.end()) return;
+    found->second.isStarted = true;
+    if (found->second.isEnded) end(socket, found->second);
+}
+
+void ConnectionWatch::refused(int socket, std::uint64_t number) {
+    const std::lock_guard lock(m_mutex);
+    const auto found = m_watched.find(socket);
+    // Its socket is closed, and may be another connection's by now.
+    if (found != m_watched.end() && found->second.number == number) m_watched.erase(found);
 }
 
 void ConnectionWatch::closed(int socket) {
-    const std::lock_guard lock(m_mutex);
-    m_watched.erase(socket);
+    {
+        const std::lock_guard lock(m_mutex);
+        m_watched.erase(socket);
+        ++m_closures;
+    }
+    m_closed.notify_all();
 }
 
-void ConnectionWatch::set(int socket, const Watched& watched) {
+void ConnectionWatch::set(int socket, Clock::time_point deadline, bool isIdle) {
     const std::lock_guard lock(m_mutex);
     const auto found = m_watched.find(socket);
     if (found == m_watched.end()) return;  // closed meanwhile; the number may be another connection's soon
-    found->second = watched;
-    if (m_ending && watched.isIdle) end(socket);
+    found->second.deadline = deadline;
+    found->second.isIdle = isIdle;
+    if (m_stopping && isIdle) end(socket, found->second);
 }
 
 void ConnectionWatch::allow(int socket, Clock::duration allowed) {
-    set(socket, {Clock::now() + allowed, false});
+    set(socket, Clock::now() + allowed, false);
 }
 
-void ConnectionWatch::suspend(int socket) {
-    set(socket, {Clock::time_point::max(), false});
+std::stop_token ConnectionWatch::suspend(int socket) {
+    set(socket, Clock::time_point::max(), false);
+    const std::lock_guard lock(m_mutex);
+    const auto found = m_watched.find(socket);
+    return found == m_watched.end() ? std::stop_token() : found->second.waiting.get_token();
 }
 
 void ConnectionWatch::idle(int socket, Clock::duration allowed) {
-    set(socket, {Clock::now() + allowed, true});
+    set(socket, Clock::now() + allowed, true);
 }
 
 void ConnectionWatch::endIdle() {
     const std::lock_guard lock(m_mutex);
     // Those at work end by themselves: their answers carry "Connection: close".
-    m_ending = true;
-    for (const auto& [socket, watched] : m_watched) {
-        if (watched.isIdle) end(socket);
+    m_stopping = true;
+    for (auto& [socket, watched] : m_watched) {
+        if (watched.isIdle) end(socket, watched);
     }
+}
+
+void ConnectionWatch::endWaiting() {
+    const std::lock_guard lock(m_mutex);
+    for (auto& [socket, watched] : m_watched)
+        watched.waiting.request_stop();
 }
 
 void ConnectionWatch::run(const std::stop_token& stop) {
@@ -61,8 +87,12 @@ void ConnectionWatch::run(const std::stop_token& stop) {
     while (!stop.stop_requested()) {
         m_stopped.wait_for(lock, stop, kTick, [] { return false; });
         const auto now = Clock::now();
-        for (const auto& [socket, watched] : m_watched) {
-            if (watched.deadline <= now) end(socket);
+        // What has never started was given up by the library.
+        std::erase_if(m_watched, [&](const auto& each) {
+            return !each.second.isStarted && each.second.deadline <= now;
+        });
+        for (auto& [socket, watched] : m_watched) {
+            if (watched.deadline <= now) end(socket, watched);
         }
     }
 }

@@ -1,8 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Host/Server/HttpRequest.h"
 
-#include <arpa/inet.h>
-#include <netinet/in.h>
 #include <poll.h>
 #include <sys/socket.h>
 
@@ -11,9 +9,11 @@
 
 #include "CimXml/Response.h"
 #include "Host/Authentication/Authentication.h"
+#include "Host/Authentication/ClientAddress.h"
 #include "Host/Operations/Dispatcher.h"
 #include "Host/Server/ConnectionWatch.h"
 #include "Host/Server/HttpServer.h"
+#include "Host/Server/LocalSocket.h"
 #include "Utils/Log.h"
 
 namespace host {
@@ -21,19 +21,6 @@ namespace host {
 namespace {
 
 constexpr const char* kRealm = "Basic realm=\"Quenx management\", charset=\"UTF-8\"";
-
-std::string addressOf(MHD_Connection* connection) {
-    const MHD_ConnectionInfo* info =
-        ::MHD_get_connection_info(connection, MHD_CONNECTION_INFO_CLIENT_ADDRESS);
-    if (info == nullptr || info->client_addr == nullptr) return "unknown";
-    std::array<char, INET6_ADDRSTRLEN> text{};
-    const void* bytes =
-        info->client_addr->sa_family == AF_INET6
-            ? static_cast<const void*>(&reinterpret_cast<const sockaddr_in6*>(info->client_addr)->sin6_addr)
-            : static_cast<const void*>(&reinterpret_cast<const sockaddr_in*>(info->client_addr)->sin_addr);
-    ::inet_ntop(info->client_addr->sa_family, bytes, text.data(), static_cast<socklen_t>(text.size()));
-    return text.data();
-}
 
 /// Adds the header to the lengths, if it is one.
 MHD_Result addContentLength(void* lengths, MHD_ValueKind, const char* name, const char* value) {
@@ -91,6 +78,12 @@ MHD_Response* makeResponse(HttpAnswer& answer) {
 
 }  // namespace
 
+std::string addressOf(MHD_Connection* connection) {
+    const MHD_ConnectionInfo* info =
+        ::MHD_get_connection_info(connection, MHD_CONNECTION_INFO_CLIENT_ADDRESS);
+    return info == nullptr || info->client_addr == nullptr ? "unknown" : addressText(*info->client_addr);
+}
+
 HttpRequest::HttpRequest(HttpServer& server, MHD_Connection* connection, const char* method)
     : m_server(server),
       m_connection(connection),
@@ -108,13 +101,24 @@ bool HttpRequest::isBodySmall() const {
     return !m_head.isChunked && length && *length <= m_server.m_limits.anonymousBodyBytes;
 }
 
+bool HttpRequest::isLocal() const {
+    return m_head.address == kLocalAddress;
+}
+
 std::optional<HttpAnswer> HttpRequest::authenticate() {
-    // While we wait for a turn or check a password, the client is not the slow one.
-    m_server.m_watch->suspend(m_socket);
-    AuthenticationResult result =
-        m_server.m_authentication.authenticate(m_head.authorization, m_head.address);
-    if (result.outcome != AuthenticationOutcome::Accepted) return answerOf(result.outcome);
-    m_user = std::move(result.user);
+    if (isLocal()) {
+        const std::optional<User> user = localUserAt(m_socket);
+        if (!user) return HttpAnswer::plain(403);
+        m_user = *user;
+    } else {
+        // While we wait for a turn or check a password, the client is not the slow one.
+        const std::stop_token ended = m_server.m_watch->suspend(m_socket);
+        AuthenticationResult result =
+            m_server.m_authentication.authenticate(m_head.authorization, m_head.address, ended);
+        if (result.outcome != AuthenticationOutcome::Accepted) return answerOf(result.outcome);
+        m_user = std::move(result.user);
+    }
+    m_server.m_watch->loggedIn(m_socket);
     return std::nullopt;
 }
 
@@ -143,7 +147,8 @@ void HttpRequest::take(const char* data, std::size_t size) {
 HttpAnswer HttpRequest::carryOut() {
     // From here on the time is ours: an operation may read an image of many megabytes.
     m_server.m_watch->suspend(m_socket);
-    const HeldSlot worker(m_server.m_workers, m_server.m_limits.requestTime);
+    Slots& workers = isLocal() ? m_server.m_localWorkers : m_server.m_workers;
+    const HeldSlot worker(workers, m_server.m_limits.requestTime);
     if (!worker) return HttpAnswer::withHeader(503, "Retry-After", "10");
     try {
         const cimxml::Request request = cimxml::readRequest(m_body);

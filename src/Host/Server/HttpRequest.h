@@ -50,6 +50,9 @@ std::optional<HttpAnswer> checkHead(const HttpHead& head, std::size_t bodyLimit)
 
 class HttpServer;
 
+/// The address of the client, as addressText() has it.
+std::string addressOf(MHD_Connection* connection);
+
 /// One request, from its head to its answer, on the thread of its connection.
 class HttpRequest {
   public:
@@ -71,6 +74,7 @@ class HttpRequest {
     void drain();
 
   private:
+    bool isLocal() const;
     std::optional<HttpAnswer> authenticate();
     HttpAnswer carryOut();
     MHD_Result queue(HttpAnswer answer);

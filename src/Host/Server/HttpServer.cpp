@@ -2,6 +2,7 @@
 #include "Host/Server/HttpServer.h"
 
 #include <microhttpd.h>
+#include <netinet/in.h>
 #include <unistd.h>
 
 #include <cstdarg>
@@ -10,6 +11,7 @@
 
 #include "Host/Server/ConnectionWatch.h"
 #include "Host/Server/HttpRequest.h"
+#include "Host/Server/LocalSocket.h"
 #include "Host/Server/ServerCertificate.h"
 #include "Utils/Log.h"
 
@@ -32,6 +34,14 @@ int retrieveCertificate(gnutls_session_t, const gnutls_datum_t*, int, const gnut
     *length = certificate->length();
     *key = certificate->key();
     return 0;
+}
+
+std::uint16_t portOf(int listener) {
+    sockaddr_storage address{};
+    socklen_t length = sizeof address;
+    ::getsockname(listener, reinterpret_cast<sockaddr*>(&address), &length);
+    // The port stands at the same place in both families.
+    return ntohs(reinterpret_cast<const sockaddr_in&>(address).sin_port);
 }
 
 int socketOf(MHD_Connection* connection) {
@@ -82,11 +92,11 @@ struct HttpServer::Callbacks {
     static void connection(void* server, MHD_Connection* connection, void**,
                            MHD_ConnectionNotificationCode code) {
         auto& self = *static_cast<HttpServer*>(server);
-        if (code == MHD_CONNECTION_NOTIFY_STARTED) {
-            self.m_watch->opened(socketOf(connection), self.m_limits.headerTime);
-        } else {
-            self.m_watch->closed(socketOf(connection));
-        }
+        const int socket = socketOf(connection);
+        if (code == MHD_CONNECTION_NOTIFY_STARTED)
+            self.m_watch->started(socket);
+        else
+            self.m_watch->closed(socket);
     }
 };
 
@@ -95,14 +105,16 @@ HttpServer::HttpServer(const ServerLimits& limits, Dispatcher& dispatcher, Authe
       m_dispatcher(dispatcher),
       m_authentication(authentication),
       m_workers(static_cast<std::ptrdiff_t>(limits.workers)),
-      m_watch(std::make_unique<ConnectionWatch>()) {}
+      m_localWorkers(static_cast<std::ptrdiff_t>(ConnectionWatch::kLocalConnections)),
+      m_watch(std::make_unique<ConnectionWatch>(limits)) {}
 
 HttpServer::~HttpServer() {
     if (!m_stopping.load()) stopAccepting();
     // The library waits for its threads, and some of them may sit out the delay after a wrong password.
-    m_authentication.stop();
-    for (MHD_Daemon* daemon : m_daemons)
-        ::MHD_stop_daemon(daemon);
+    m_watch->endWaiting();
+    for (MHD_Daemon* library : m_libraries) {
+        if (library != nullptr) ::MHD_stop_daemon(library);
+    }
     currentCertificate.store(nullptr);
 }
 
@@ -111,19 +123,18 @@ void HttpServer::setCertificate(std::shared_ptr<const ServerCertificate> certifi
     m_certificates.push_back(std::move(certificate));
 }
 
-std::uint16_t HttpServer::listen(const std::string& address, std::uint16_t port, bool tls) {
+MHD_Daemon* HttpServer::library(bool tls) {
+    MHD_Daemon*& library = m_libraries[tls ? 1 : 0];
+    if (library != nullptr) return library;
     constexpr unsigned int kFlags = MHD_USE_INTERNAL_POLLING_THREAD | MHD_USE_THREAD_PER_CONNECTION |
-                                    MHD_USE_POLL | MHD_USE_ITC | MHD_USE_ERROR_LOG;
-    const unsigned int flags = tls ? kFlags | MHD_USE_TLS : kFlags;
-    const int socket = openListener(address, port);
+                                    MHD_USE_POLL | MHD_USE_ITC | MHD_USE_ERROR_LOG | MHD_USE_NO_LISTEN_SOCKET;
     // The logger comes first, so that complaints about the others reach it.
     std::vector<MHD_OptionItem> options{
         {MHD_OPTION_EXTERNAL_LOGGER, reinterpret_cast<intptr_t>(&logLibrary), nullptr},
-        {MHD_OPTION_LISTEN_SOCKET, socket, nullptr},
         {MHD_OPTION_NOTIFY_COMPLETED, reinterpret_cast<intptr_t>(&Callbacks::completed), this},
         {MHD_OPTION_NOTIFY_CONNECTION, reinterpret_cast<intptr_t>(&Callbacks::connection), this},
-        {MHD_OPTION_CONNECTION_LIMIT, m_limits.connections, nullptr},
-        {MHD_OPTION_PER_IP_CONNECTION_LIMIT, m_limits.connectionsPerAddress, nullptr},
+        // Never reached: the watch admits no more, and at its limit the library locks a mutex for good.
+        {MHD_OPTION_CONNECTION_LIMIT, 2 * ConnectionWatch::mostOf(m_limits), nullptr},
         {MHD_OPTION_CONNECTION_TIMEOUT, static_cast<intptr_t>(m_limits.idleTime.count()), nullptr},
         {MHD_OPTION_CONNECTION_MEMORY_LIMIT, static_cast<intptr_t>(m_limits.headerBytes), nullptr},
         {MHD_OPTION_STRICT_FOR_CLIENT, 1, nullptr}};
@@ -133,20 +144,39 @@ std::uint16_t HttpServer::listen(const std::string& address, std::uint16_t port,
         options.push_back({MHD_OPTION_HTTPS_PRIORITIES, 0, const_cast<char*>(kTlsPriorities)});
     }
     options.push_back({MHD_OPTION_END, 0, nullptr});
-    MHD_Daemon* daemon = ::MHD_start_daemon(flags, port, nullptr, nullptr, &Callbacks::request, this,
-                                            MHD_OPTION_ARRAY, options.data(), MHD_OPTION_END);
-    if (daemon == nullptr)
+    library = ::MHD_start_daemon(tls ? kFlags | MHD_USE_TLS : kFlags, 0, nullptr, nullptr,
+                                 &Callbacks::request, this, MHD_OPTION_ARRAY, options.data(), MHD_OPTION_END);
+    if (library == nullptr)
         throw std::runtime_error("Cannot start the HTTP server. The system log says more.");
-    m_daemons.push_back(daemon);
-    return ::MHD_get_daemon_info(daemon, MHD_DAEMON_INFO_BIND_PORT)->port;
+    return library;
+}
+
+void HttpServer::accept(int listener, Acceptor::Taker taker) {
+    m_acceptors.push_back(std::make_unique<Acceptor>(listener, *m_watch, std::move(taker)));
+}
+
+std::uint16_t HttpServer::listen(const std::string& address, std::uint16_t port, bool tls) {
+    MHD_Daemon* serving = library(tls);
+    const int listener = openListener(address, port);
+    const std::uint16_t actualPort = portOf(listener);
+    accept(listener, [serving](int socket, const sockaddr& client, socklen_t length) {
+        return ::MHD_add_connection(serving, socket, &client, length) == MHD_YES;
+    });
+    return actualPort;
+}
+
+void HttpServer::listenLocally(const std::string& path) {
+    MHD_Daemon* serving = library(false);
+    m_localSocket = std::make_unique<LocalSocket>(path);
+    accept(m_localSocket->listener(), [serving](int socket, const sockaddr& client, socklen_t length) {
+        return ::MHD_add_connection(serving, socket, &client, length) == MHD_YES;
+    });
 }
 
 void HttpServer::stopAccepting() {
     m_stopping.store(true);
-    for (MHD_Daemon* daemon : m_daemons) {
-        const int socket = ::MHD_quiesce_daemon(daemon);
-        if (socket >= 0) ::close(socket);  // from now on a client is refused at once, not left waiting
-    }
+    m_localSocket.reset();
+    m_acceptors.clear();
     m_watch->endIdle();
 }
 

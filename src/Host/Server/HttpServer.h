@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include <array>
 #include <atomic>
 #include <cstdint>
 #include <memory>
@@ -9,6 +10,7 @@
 #include <vector>
 
 #include "Host/Authentication/Authentication.h"
+#include "Host/Server/Acceptor.h"
 #include "Host/Settings.h"
 
 struct MHD_Daemon;
@@ -18,6 +20,7 @@ namespace host {
 class ConnectionWatch;
 class Dispatcher;
 class HttpRequest;
+class LocalSocket;
 class ServerCertificate;
 
 /// An address and port that cannot be listened on. what() tells a person why, and what to do.
@@ -50,6 +53,8 @@ class HttpServer {
     /// Returns the port, also where 0 asked for any. Throws std::runtime_error. TLS needs a certificate
     /// first.
     std::uint16_t listen(const std::string& address, std::uint16_t port, bool tls);
+    /// On a Unix socket. Throws std::runtime_error.
+    void listenLocally(const std::string& path);
     /// What connections from now on are shown.
     void setCertificate(std::shared_ptr<const ServerCertificate> certificate);
 
@@ -62,16 +67,22 @@ class HttpServer {
     friend class HttpRequest;
     struct Callbacks;
 
+    MHD_Daemon* library(bool tls);
+    void accept(int listener, Acceptor::Taker taker);
+
     const ServerLimits m_limits;
     Dispatcher& m_dispatcher;
     Authentication& m_authentication;
     Slots m_workers;
+    Slots m_localWorkers;
     std::atomic<unsigned int> m_inFlight{0};
     std::atomic<bool> m_stopping{false};
     /// All so far: a handshake may still use an old one.
     std::vector<std::shared_ptr<const ServerCertificate>> m_certificates;
     std::unique_ptr<ConnectionWatch> m_watch;
-    std::vector<MHD_Daemon*> m_daemons;
+    std::array<MHD_Daemon*, 2> m_libraries{};  ///< plain and with TLS, once they are needed
+    std::unique_ptr<LocalSocket> m_localSocket;
+    std::vector<std::unique_ptr<Acceptor>> m_acceptors;
 };
 
 }  // namespace host

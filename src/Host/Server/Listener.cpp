@@ -49,7 +49,7 @@ const char* adviceFor(int error) {
 
 int openListener(const std::string& address, std::uint16_t port) {
     const auto place = addressOf(address, port);
-    const int socket = ::socket(place->ai_family, SOCK_STREAM | SOCK_CLOEXEC | SOCK_NONBLOCK, 0);
+    const int socket = ::socket(place->ai_family, SOCK_STREAM | SOCK_CLOEXEC, 0);
     const int yes = 1;
     // Without it a restart would fail as long as connections of the last run are in the state TIME_WAIT.
     if (socket >= 0) ::setsockopt(socket, SOL_SOCKET, SO_REUSEADDR, &yes, sizeof yes);

@@ -1,0 +1,145 @@
+// SPDX-License-Identifier: Apache-2.0
+// Which connection has to go when there are too many.
+#include <algorithm>
+
+#include "Host/Authentication/ClientAddress.h"
+#include "Host/Server/ConnectionWatch.h"
+#include "Utils/Log.h"
+
+namespace host {
+
+namespace {
+
+constexpr std::size_t kMaxKnown = 1024;  // networks
+constexpr unsigned int kEnded = 16;      // connections whose threads still end, and a quarter of the limit
+constexpr std::chrono::minutes kBetweenNotes{1};
+constexpr std::chrono::milliseconds kMoment{100};
+
+/// What nobody gets from whose network nobody has logged in.
+unsigned int keptForKnown(const ServerLimits& limits) {
+    return limits.connections / 4;
+}
+
+}  // namespace
+
+bool ConnectionWatch::Watched::isLocal() const {
+    return network == kLocalAddress;
+}
+
+unsigned int ConnectionWatch::mostOf(const ServerLimits& limits) {
+    return limits.connections + limits.connections / 4 + kEnded + kLocalConnections;
+}
+
+std::size_t ConnectionWatch::count(const Condition& isMeant) const {
+    return static_cast<std::size_t>(std::count_if(m_watched.begin(), m_watched.end(), [&](const auto& each) {
+        return !each.second.isEnded && isMeant(each.second);
+    }));
+}
+
+bool ConnectionWatch::endOldest(const Condition& isMeant) {
+    auto oldest = m_watched.end();
+    for (auto each = m_watched.begin(); each != m_watched.end(); ++each) {
+        if (each->second.isEnded || !isMeant(each->second)) continue;
+        if (oldest == m_watched.end() || each->second.number < oldest->second.number) oldest = each;
+    }
+    if (oldest == m_watched.end()) return false;
+    end(oldest->first, oldest->second);
+    return true;
+}
+
+bool ConnectionWatch::endOldestOfMost(const Condition& isMeant) {
+    // Not just the oldest: whoever opens a thousand a second would drop those of others before they log in.
+    std::map<std::string, unsigned int> counts;
+    for (const auto& [socket, watched] : m_watched) {
+        if (!watched.isEnded && isMeant(watched)) ++counts[watched.network];
+    }
+    const auto most = std::max_element(counts.begin(), counts.end(), [](const auto& left, const auto& right) {
+        return left.second < right.second;
+    });
+    return most != counts.end() &&
+           endOldest([&](const Watched& each) { return each.network == most->first && isMeant(each); });
+}
+
+bool ConnectionWatch::makeRoom(const std::string& network, std::string& reached) {
+    const auto isHere = [&](const Watched& each) { return each.network == network; };
+    const auto isNew = [](const Watched& each) { return !each.isLocal() && !each.isLoggedIn; };
+    const auto isStranger = [&](const Watched& each) { return isNew(each) && !isKnown(each.network); };
+    if (network == kLocalAddress) {
+        if (count(isHere) < kLocalConnections) return true;
+        reached = "the " + std::to_string(kLocalConnections) + " connections of listen.socket";
+        return endOldest([&](const Watched& each) { return isHere(each) && each.isIdle; });
+    }
+    if (count(isHere) >= m_limits.connectionsPerAddress) {
+        reached = "limits.connections_per_address (" + std::to_string(m_limits.connectionsPerAddress) + ")";
+        return endOldest([&](const Watched& each) { return isHere(each) && isNew(each); });
+    }
+    const bool isFull =
+        count([](const Watched& each) { return !each.isLocal(); }) >= m_limits.connections ||
+        (!isKnown(network) && count(isStranger) >= m_limits.connections - keptForKnown(m_limits));
+    if (!isFull) return true;
+    reached = "limits.connections (" + std::to_string(m_limits.connections) + ")";
+    return endOldestOfMost(isStranger) || (isKnown(network) && endOldestOfMost(isNew));
+}
+
+std::optional<std::uint64_t> ConnectionWatch::admit(int socket, const std::string& network,
+                                                    const std::stop_token& stop) {
+    std::string reached;
+    std::optional<std::uint64_t> number;
+    {
+        std::unique_lock lock(m_mutex);
+        const auto hasThreads = [&] {
+            const auto others = std::count_if(m_watched.begin(), m_watched.end(),
+                                              [](const auto& each) { return !each.second.isLocal(); });
+            return others < static_cast<std::ptrdiff_t>(mostOf(m_limits) - kLocalConnections);
+        };
+        if (network != kLocalAddress && !m_closed.wait(lock, stop, hasThreads)) return std::nullopt;
+        if (makeRoom(network, reached)) {
+            Watched& watched = m_watched[socket] = {};
+            watched.network = network;
+            watched.deadline = Clock::now() + m_limits.headerTime;
+            number = watched.number = ++m_lastNumber;
+        }
+    }
+    if (!reached.empty()) {
+        noteLimit(reached, number ? "closed a connection that has not logged in for a new one from " + network
+                                  : "refused a connection from " + network + ", since all others are in use");
+    }
+    return number;
+}
+
+void ConnectionWatch::giveUpOne(const std::stop_token& stop) {
+    std::unique_lock lock(m_mutex);
+    endOldestOfMost([](const Watched& each) { return !each.isLocal() && !each.isLoggedIn; });
+    m_closed.wait_for(lock, stop, kMoment, [&, before = m_closures] { return m_closures != before; });
+}
+
+void ConnectionWatch::loggedIn(int socket) {
+    const std::lock_guard lock(m_mutex);
+    const auto found = m_watched.find(socket);
+    if (found == m_watched.end()) return;
+    found->second.isLoggedIn = true;
+    m_known[found->second.network] = ++m_lastNumber;
+    if (m_known.size() <= kMaxKnown) return;
+    m_known.erase(std::min_element(m_known.begin(), m_known.end(), [](const auto& left, const auto& right) {
+        return left.second < right.second;
+    }));
+}
+
+void ConnectionWatch::noteLimit(const std::string& limit, const std::string& what) {
+    unsigned int silent = 0;
+    {
+        const std::lock_guard lock(m_noteMutex);
+        Note& note = m_notes[limit];
+        const auto now = Clock::now();
+        if (now < note.next) {
+            ++note.silent;
+            return;
+        }
+        silent = std::exchange(note.silent, 0);
+        note.next = now + kBetweenNotes;
+    }
+    const std::string more = silent == 0 ? "" : "; this was so " + std::to_string(silent) + " times before";
+    QUENX_ERROR_TEXT(limit + " reached: " + what + more);
+}
+
+}  // namespace host
