@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Cli/Arguments.h"
 
+#include <unistd.h>
+
 #include <CLI/CLI.hpp>
 #include <algorithm>
 #include <iostream>
@@ -33,8 +35,8 @@ void addServerOptions(CLI::App& app, ServerSettings& server, const std::vector<C
     CLI::Option* url =
         app.add_option_function<std::string>(
                "--server", [&server](const std::string& text) { server.url.emplace(text); },
-               "Use a WBEM server (https://host:5989) instead of this process; images are then files on "
-               "that host")
+               "Use a WBEM server (https://host:5989; for root, unix: is the one of this machine) instead of "
+               "this process; images are then files on that host")
             ->type_name("URL");
     // A server has its own; an option without effect would let its user believe otherwise.
     for (CLI::Option* option : localOptions)
@@ -152,9 +154,10 @@ void addVerbs(CLI::App& app, Arguments& arguments) {
     addVerb(app, arguments, "identities", showIdentities,
             "List the images that the inventory offers, and those installed");
     addImageVerbs(app, arguments);
-    addVerb(app, arguments, "jobs", showJobs, "List the jobs on a server");
+    addVerb(app, arguments, "jobs", showJobs,
+            "List the jobs on a server (for root, by default that of this machine)");
     CLI::App* verb = addVerb(app, arguments, "delete", deleteJob,
-                             "Delete a job from the list of a server; its update continues");
+                             "Delete a job from the list that \"jobs\" shows; its update continues");
     addValue(*verb, "job", arguments.options.job, "JOB",
              "Job: its id as \"jobs\" lists it, or the number at its end")
         ->required();
@@ -262,6 +265,16 @@ void requireOneImage(const CLI::App& app, const Arguments& arguments) {
                        askHelpOf(*app.get_subcommands().front()));
 }
 
+/// Jobs are kept by a server: where no other is named, the one of this machine, if it is there for this user.
+void chooseServer(Arguments& arguments) {
+    const ProviderSettings& own = arguments.providers;
+    const bool namesProviders =
+        !own.configFile.empty() || !own.adapterDescription.empty() || !own.directory.empty();
+    const bool needsServer = arguments.verb == showJobs || arguments.verb == deleteJob;
+    if (arguments.server.url || namesProviders || !needsServer) return;
+    if (::access(localSocket().c_str(), W_OK) == 0) arguments.server.url.emplace("unix:");
+}
+
 /// Prints the help of the program, or with a name that of a verb.
 void printHelp(const CLI::App& app, const std::string& name) {
     // Not App::help(): once a verb was read, that gives the help of the verb.
@@ -309,6 +322,7 @@ std::optional<Arguments> readArguments(int argc, char** argv) {
         return std::nullopt;
     }
     requireOneImage(app, arguments);
+    chooseServer(arguments);
     return arguments;
 }
 

@@ -15,7 +15,8 @@ ChosenEnvironment::ChosenEnvironment() {
         {"PATH", "/usr/local/sbin:/usr/local/bin:/usr/sbin:/usr/bin:/sbin:/bin"},
         {"HOME", m_home.path()},
         {"LC_ALL", "C.UTF-8"},
-        {"QUENX_ADAPTERS", m_home.write("adapters.toml", "")}};
+        {"QUENX_ADAPTERS", m_home.write("adapters.toml", "")},
+        {"QUENXCTL_SOCKET", m_home / "socket"}};
     for (const char* kept : {"TMPDIR", "ASAN_OPTIONS", "LSAN_OPTIONS", "TSAN_OPTIONS", "UBSAN_OPTIONS",
                              "ASAN_SYMBOLIZER_PATH", "GCOV_PREFIX", "GCOV_PREFIX_STRIP"}) {
         if (const char* value = std::getenv(kept)) chosen.emplace(kept, value);

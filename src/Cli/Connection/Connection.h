@@ -38,20 +38,27 @@ struct ProviderSettings {
 /// read or loaded.
 Connection openProviders(const ProviderSettings& settings);
 
-/// The address of a CIM-XML server, whole: scheme, host, port and path.
+/// The Unix socket of this machine's object manager: QUENXCTL_SOCKET, else its default.
+std::string localSocket();
+
+/// The address of a CIM-XML server, whole: scheme, host, port and path, or "unix:" and the path of a socket.
 class ServerUrl {
   public:
-    /// Reads "https://host", with a port and a path that may be left out. Throws CommandError that says how
-    /// to write it: a user who mistypes it must not send a password in clear, or to another host.
+    /// Reads "https://host", with a port and a path that may be left out, or "unix:", with a path if it is
+    /// not localSocket(). Throws CommandError that says how to write it: a user who mistypes it must not send
+    /// a password in clear, or to another host.
     explicit ServerUrl(const std::string& text);
 
     const std::string& text() const { return m_text; }
+    /// The path of the Unix socket; empty for a server on the network.
+    const std::string& socket() const { return m_socket; }
     bool isEncrypted() const { return m_isEncrypted; }
     /// True when the server is on this machine.
     bool isLoopback() const { return m_isLoopback; }
 
   private:
     std::string m_text;
+    std::string m_socket;
     bool m_isEncrypted = false;
     bool m_isLoopback = false;
 };
@@ -67,7 +74,8 @@ struct ServerSettings {
 
 /// Prepares requests to any WBEM server that serves these classes, over CIM-XML; nothing is sent yet. Warns
 /// on standard error of what gives the password away. The password is QUENXCTL_PASSWORD, else asked for on
-/// the terminal. Throws CommandError where nobody can answer.
+/// the terminal. Throws CommandError where nobody can answer. On a Unix socket nothing is asked: the server
+/// learns from the system who calls.
 /// @param settings       with a URL
 /// @param isInterrupted  asked about once a second while an answer is waited for; true ends the request with
 ///                       a CommandError of ExitStatus::Interrupted

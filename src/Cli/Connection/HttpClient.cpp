@@ -3,8 +3,10 @@
 
 #include <arpa/inet.h>
 
+#include <cstdlib>
 #include <string_view>
 
+#include "CimXml/Request.h"
 #include "Cli/Display/Messages.h"
 #include "Utils/Utils.h"
 
@@ -86,7 +88,19 @@ std::string adviceFor(CURLcode code, bool isEncrypted) {
 
 }  // namespace
 
+std::string localSocket() {
+    const char* chosen = std::getenv("QUENXCTL_SOCKET");
+    return chosen == nullptr || *chosen == '\0' ? cimxml::kDefaultSocket : chosen;
+}
+
 ServerUrl::ServerUrl(const std::string& text) {
+    constexpr std::string_view kLocal = "unix:";
+    if (text.starts_with(kLocal)) {
+        m_socket = text.size() == kLocal.size() ? localSocket() : text.substr(kLocal.size());
+        m_text = std::string(kLocal) + m_socket;
+        m_isLoopback = true;
+        return;
+    }
     if (text.find("://") == std::string::npos) refuseUrl(text, "does not begin with https:// or http://");
     const UrlParts url(curl_url(), curl_url_cleanup);
     // Any scheme, so that a wrong one is refused in words that say which are right.
@@ -112,6 +126,7 @@ HttpClient::HttpClient(const ServerSettings& settings, const std::string& user, 
                        std::function<bool()> isInterrupted)
     : m_curl(curl_easy_init(), curl_easy_cleanup),
       m_url(settings.url->text()),
+      m_isLocal(!settings.url->socket().empty()),
       m_namesCaFile(!settings.caFile.empty()),
       m_isInterrupted(std::move(isInterrupted)) {
     if (m_curl == nullptr) {
@@ -122,7 +137,8 @@ HttpClient::HttpClient(const ServerSettings& settings, const std::string& user, 
     // An answer may have to wait for the verification of a large image.
     constexpr long kAnswerSeconds = 120;
     set(CURLOPT_ERRORBUFFER, m_error.data());
-    set(CURLOPT_URL, m_url.c_str());
+    set(CURLOPT_URL, m_isLocal ? "http://localhost/cimom" : m_url.c_str());
+    if (m_isLocal) set(CURLOPT_UNIX_SOCKET_PATH, settings.url->socket().c_str());
     set(CURLOPT_PROTOCOLS_STR, "http,https");
     set(CURLOPT_NOSIGNAL, 1L);  // signals are this program's own business
     set(CURLOPT_CONNECTTIMEOUT, kConnectSeconds);
@@ -132,10 +148,12 @@ HttpClient::HttpClient(const ServerSettings& settings, const std::string& user, 
     set(CURLOPT_NOPROGRESS, 0L);
     set(CURLOPT_XFERINFODATA, &m_isInterrupted);
     set(CURLOPT_XFERINFOFUNCTION, &stopIfInterrupted);
-    // The one scheme that every WBEM server has. Naming it saves a first request that would be refused.
-    set(CURLOPT_HTTPAUTH, CURLAUTH_BASIC);
-    set(CURLOPT_USERNAME, user.c_str());
-    set(CURLOPT_PASSWORD, password.c_str());
+    if (!m_isLocal) {
+        // The one scheme that every WBEM server has. Naming it saves a first request that would be refused.
+        set(CURLOPT_HTTPAUTH, CURLAUTH_BASIC);
+        set(CURLOPT_USERNAME, user.c_str());
+        set(CURLOPT_PASSWORD, password.c_str());
+    }
     // A proxy would take 127.0.0.1 for itself, and get the password.
     if (settings.url->isLoopback()) set(CURLOPT_NOPROXY, "*");
     if (m_namesCaFile) set(CURLOPT_CAINFO, settings.caFile.c_str());
@@ -175,7 +193,8 @@ void HttpClient::refuse(CURLcode code) const {
     }
     const std::string reason = m_error.front() == '\0' ? curl_easy_strerror(code) : m_error.data();
     const std::string what = "The request to " + m_url + " failed: " + reason + ".";
-    const std::string advice = adviceFor(code, m_url.starts_with("https:"));
+    const std::string advice = m_isLocal ? "Check that quenx-cimd runs, and listens there (listen.socket)."
+                                         : adviceFor(code, m_url.starts_with("https:"));
     if (sent > 0) throw NoAnswer(ExitStatus::Failed, what, advice);
     throw CommandError(code == CURLE_SSL_CACERT_BADFILE ? ExitStatus::WrongUse : ExitStatus::Failed, what,
                        advice);

@@ -42,6 +42,7 @@ class HttpClient {
     std::unique_ptr<CURL, decltype(&curl_easy_cleanup)> m_curl;
     std::array<char, CURL_ERROR_SIZE> m_error{};
     std::string m_url;
+    bool m_isLocal;  ///< over a Unix socket
     bool m_namesCaFile;
     std::function<bool()> m_isInterrupted;
 };

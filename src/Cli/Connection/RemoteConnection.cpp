@@ -1,7 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
+#include <sys/stat.h>
 #include <unistd.h>
 
 #include <algorithm>
+#include <cerrno>
 #include <cstdlib>
 #include <iostream>
 #include <utility>
@@ -263,9 +265,43 @@ std::string passwordOf(const std::string& user) {
     return password;
 }
 
+/// Whoever can make a socket elsewhere must not be taken for the server: a command that it answers would seem
+/// to be done.
+void requireOwnSocket(const std::string& path) {
+    struct stat status {};
+    if (::stat(path.c_str(), &status) != 0 || ::access(path.c_str(), W_OK) != 0) {
+        const bool isDenied = errno == EACCES;
+        throw CommandError(isDenied ? ExitStatus::Failed : ExitStatus::NotFound,
+                           isDenied ? "Only root may use " + path + "."
+                                    : "There is no socket " + path +
+                                          ": quenx-cimd does not run, or not with "
+                                          "this listen.socket.",
+                           isDenied ? "Run as root, or name an https:// address with --server."
+                                    : "Start it, or name its socket: --server unix:PATH.");
+    }
+    if (S_ISSOCK(status.st_mode) && (status.st_uid == 0 || status.st_uid == ::geteuid())) return;
+    throw CommandError(ExitStatus::WrongUse, path + " is no socket of root's or of your own.",
+                       "Name the socket of quenx-cimd: --server unix:PATH.");
+}
+
+/// Of a user who names himself, or a certificate, one that believes in a password or in encryption.
+void requireNoLogin(const ServerSettings& settings) {
+    if (settings.user.empty() && settings.caFile.empty() && !settings.insecure) return;
+    throw CommandError(ExitStatus::WrongUse,
+                       "--user, --cacert and --insecure cannot be used with --server unix:.",
+                       "Leave them out: on a Unix socket the system itself says who you are.");
+}
+
 }  // namespace
 
 Connection openServer(const ServerSettings& settings, std::function<bool()> isInterrupted) {
+    if (!settings.url->socket().empty()) {
+        requireNoLogin(settings);
+        requireOwnSocket(settings.url->socket());
+        return {.operations = std::make_shared<RemoteOperations>(settings, "", "", std::move(isInterrupted)),
+                .isInProcess = false,
+                .sharesFiles = true};
+    }
     if (!settings.url->isEncrypted() && !settings.url->isLoopback()) {
         std::cerr << "quenxctl: WARNING: http:// sends the password and everything else unencrypted. Use "
                      "https:// instead.\n";

@@ -17,7 +17,7 @@ std::vector<JobView> jobsOfServer(const Connection& connection) {
     throw CommandError(
         ExitStatus::WrongUse,
         "Jobs are kept by a server, and none was named: an update in this program ends with it.",
-        "Name the server with --server.");
+        "Name the server with --server. Root needs none on a machine on which quenx-cimd runs.");
 }
 
 std::string orDash(const std::string& text) {
