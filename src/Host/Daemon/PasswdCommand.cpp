@@ -8,6 +8,7 @@
 #include "Host/Authentication/PasswordChecker.h"
 #include "Host/Daemon/CommandLine.h"
 #include "Utils/Os/Linux/EchoOff.h"
+#include "Utils/Os/Linux/FileLock.h"
 
 namespace host {
 
@@ -38,6 +39,11 @@ std::string newPassword() {
     return password;
 }
 
+/// None where there is no file yet.
+UserEntries usersOf(const std::string& file) {
+    return ::access(file.c_str(), F_OK) == 0 ? readUsersFile(file) : UserEntries();
+}
+
 void removeUser(const PasswdRequest& request, UserEntries& users) {
     if (users.erase(request.user) == 0) {
         throw std::runtime_error("There is no user \"" + request.user + "\" in " + request.usersFile +
@@ -45,12 +51,30 @@ void removeUser(const PasswdRequest& request, UserEntries& users) {
     }
 }
 
-void setPassword(const PasswdRequest& request, UserEntries& users) {
+UserEntry newEntry(const PasswdRequest& request) {
     const std::string password = newPassword();
     if (password.empty())
         throw std::runtime_error(
             "The password is empty, so nothing was changed. Type at least one character.");
-    users[request.user] = {hashPassword(password), !request.isReader};
+    return {hashPassword(password), !request.isReader};
+}
+
+/// Others may change the file at the same time, so it is read and written under a lock. Returns whether the
+/// user is new.
+bool merge(const PasswdRequest& request, const UserEntry& entry) {
+    std::error_code error;  // the lock says it better
+    std::filesystem::create_directories(std::filesystem::path(request.usersFile).parent_path(), error);
+    const os::FileLock lock(request.usersFile + ".lock", std::chrono::seconds(10));
+    if (!lock.isHeld())
+        throw std::runtime_error(lock.holder() + " is changing " + request.usersFile + ". Try again later.");
+    UserEntries users = usersOf(request.usersFile);
+    const bool isNew = !users.contains(request.user);
+    if (request.isRemoval)
+        removeUser(request, users);
+    else
+        users[request.user] = entry;
+    writeUsersFile(request.usersFile, users);
+    return isNew;
 }
 
 /// Says what it did.
@@ -61,15 +85,10 @@ void change(const PasswdRequest& request) {
                                  "blanks or colons, and do not start with #.");
     }
     // Read before the password is asked for, so that a broken file does not cost a password typed twice.
-    UserEntries users;
-    if (::access(request.usersFile.c_str(), F_OK) == 0) users = readUsersFile(request.usersFile);
-    const bool isNew = !users.contains(request.user);
-    if (request.isRemoval) {
-        removeUser(request, users);
-    } else {
-        setPassword(request, users);
-    }
-    writeUsersFile(request.usersFile, users);
+    usersOf(request.usersFile);
+    // And asked for before the lock, which nobody may hold for as long as a person thinks.
+    const UserEntry entry = request.isRemoval ? UserEntry() : newEntry(request);
+    const bool isNew = merge(request, entry);
     const std::string role = request.isReader ? "reader" : "administrator";
     std::cout << (request.isRemoval ? "Removed user" : (isNew ? "Added " : "Changed ") + role) << " \""
               << request.user << "\" "
