@@ -1,13 +1,17 @@
 // SPDX-License-Identifier: Apache-2.0
 #include <gmock/gmock.h>
+#include <gnutls/x509.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
 #include <algorithm>
+#include <ctime>
 #include <fstream>
+#include <thread>
 
 #include "Host/Authentication/PasswordChecker.h"
 #include "Host/Daemon/CommandLine.h"
+#include "Host/Daemon/Daemon.h"
 #include "Host/Daemon/SettingsField.h"
 #include "Host/Server/ServerCertificate.h"
 #include "Support/TempFolder.h"
@@ -137,6 +141,83 @@ TEST(PasswdTest, SaysHowTheFileComesToBeUsed) {
         const std::string advice = "--auth-method users --auth-users-file " + file + ".";
         EXPECT_EQ(said.find(advice) == std::string::npos, isUsed) << said;
     }
+}
+
+/// A self-signed certificate that is valid for that time.
+void writeCertificate(const std::string& keyFile, const std::string& file, std::time_t from,
+                      std::time_t until) {
+    gnutls_datum_t pem{};
+    gnutls_x509_privkey_t key{};
+    gnutls_x509_crt_t certificate{};
+    ASSERT_EQ(::gnutls_load_file(keyFile.c_str(), &pem), 0);
+    ::gnutls_x509_privkey_init(&key);
+    ASSERT_EQ(::gnutls_x509_privkey_import(key, &pem, GNUTLS_X509_FMT_PEM), 0);
+    ::gnutls_free(pem.data);
+    ::gnutls_x509_crt_init(&certificate);
+    ::gnutls_x509_crt_set_serial(certificate, "1", 1);
+    ::gnutls_x509_crt_set_activation_time(certificate, from);
+    ::gnutls_x509_crt_set_expiration_time(certificate, until);
+    ::gnutls_x509_crt_set_key(certificate, key);
+    ASSERT_EQ(::gnutls_x509_crt_sign2(certificate, certificate, key, GNUTLS_DIG_SHA256, 0), 0);
+    ASSERT_EQ(::gnutls_x509_crt_export2(certificate, GNUTLS_X509_FMT_PEM, &pem), 0);
+    std::ofstream(file).write(reinterpret_cast<const char*>(pem.data), pem.size);
+    ::gnutls_free(pem.data);
+    ::gnutls_x509_crt_deinit(certificate);
+    ::gnutls_x509_privkey_deinit(key);
+}
+
+TEST(ServerCertificateTest, IsRenewedOnlyIfMadeByAnUnsetClock) {
+    const test::TempFolder folder;
+    const host::TlsSettings files{folder / "cert.pem", folder / "key.pem", true};
+    const auto warning = [&] { return host::ServerCertificate(files.certificate, files.key).warning(); };
+    ASSERT_TRUE(host::makeTlsFiles(files));
+    EXPECT_EQ(warning(), "");
+    constexpr std::time_t day = 86400;
+    const std::time_t now = std::time(nullptr);
+    writeCertificate(files.key, files.certificate, now - 2 * day, now - day);
+    EXPECT_THAT(warning(), HasSubstr(" has expired on "));
+    EXPECT_FALSE(host::makeTlsFiles(files)) << "the administrator's own";
+    writeCertificate(files.key, files.certificate, now + day, now + 2 * day);
+    EXPECT_THAT(warning(), HasSubstr(" is not valid before "));
+    EXPECT_FALSE(host::makeTlsFiles(files));
+    for (const std::time_t unset : {std::time_t{100}, std::time_t{946684800}}) {
+        writeCertificate(files.key, files.certificate, unset - day, unset + 3650 * day);
+        EXPECT_NE(warning(), "");
+        EXPECT_TRUE(host::makeTlsFiles(files)) << unset;
+        EXPECT_EQ(warning(), "");
+    }
+    ::chmod(files.key.c_str(), 0640);
+    EXPECT_EQ(warning(), "");
+    ::chmod(files.key.c_str(), 0604);
+    EXPECT_THAT(warning, ThrowsMessage<std::runtime_error>(HasSubstr("everybody may read")));
+}
+
+TEST(WarningsTest, TellWhatWorksButIsNotMeant) {
+    Settings settings;
+    EXPECT_TRUE(host::warningsOf(settings, 4096).empty());
+    settings.listen.http = true;
+    EXPECT_TRUE(host::warningsOf(settings, 4096).empty());
+    settings.listen.address = "0.0.0.0";
+    EXPECT_THAT(host::warningsOf(settings, 256),
+                ::testing::ElementsAre(HasSubstr("listen.http sends"), HasSubstr("may have 256.")));
+}
+
+TEST(PasswdTest, LosesNoChangeThatOthersMake) {
+    const test::TempFolder folder;
+    const std::string file = folder / "users";
+    host::UserEntries users;
+    for (int i = 0; i < 8; ++i)
+        users["user" + std::to_string(i)] = {"$x", true};
+    host::writeUsersFile(file, users);
+    std::vector<std::thread> threads;
+    for (const auto& [name, entry] : users)
+        threads.emplace_back([&, name = name] {
+            EXPECT_EQ(host::runPasswd({.user = name, .usersFile = file, .isRemoval = true, .configured = {}}),
+                      0);
+        });
+    for (std::thread& each : threads)
+        each.join();
+    EXPECT_TRUE(host::readUsersFile(file).empty());
 }
 
 TEST(ConfigCheckTest, LooksAtEveryFile) {

@@ -75,8 +75,8 @@ void checkSocket(const std::string& path) {
 }
 
 void checkTls(const TlsSettings& settings) {
-    if (!areTlsFilesToBeMade(settings)) {
-        ServerCertificate(settings.certificate, settings.key);
+    if (!areTlsFilesToBeMade(settings) && !isCertificateToBeRenewed(settings)) {
+        warn(ServerCertificate(settings.certificate, settings.key).warning());
         return;
     }
     for (const std::string& file : {settings.certificate, settings.key})
@@ -139,6 +139,8 @@ int checkConfiguration(const Settings& settings) {
     if (listen.https) checkListener([&] { checkPort(listen.address, listen.httpsPort); });
     if (listen.http) checkListener([&] { checkPort(listen.address, listen.httpPort); });
     checkListener([&] { checkSocket(listen.socket); });
+    for (const std::string& text : warningsOf(settings, mostDescriptors()))
+        warn(text);
     if (listen.https) check([&] { checkTls(settings.tls); });
     check([&] { checkAuthentication(settings.authentication); });
     check([&] { checkProviderConfiguration(settings.providerConfiguration); });

@@ -88,6 +88,8 @@ void loadProviders(core::ProviderLibraries& providers, const std::string& direct
 Daemon::Daemon(const Settings& settings)
     : m_settings(settings), m_lock(settings.lockFile), m_session(settings.providerConfiguration) {
     m_lock.require();
+    for (const std::string& text : warningsOf(settings, raiseDescriptors(settings)))
+        reportProblem("Warning: " + text);
     // Before the providers come, which ask for the adapters as soon as they are called.
     if (!m_settings.adapters.empty()) ma::configureSimulator(m_settings.adapters, m_settings.adapterState);
     loadProviders(m_session.libraries(), m_settings.providers);
@@ -137,8 +139,11 @@ void Daemon::listenOn(std::uint16_t port, bool tls) {
 }
 
 void Daemon::readCertificate() {
-    m_server->setCertificate(
-        std::make_shared<const ServerCertificate>(m_settings.tls.certificate, m_settings.tls.key));
+    auto certificate =
+        std::make_shared<const ServerCertificate>(m_settings.tls.certificate, m_settings.tls.key);
+    const std::string warning = certificate->warning();
+    if (!warning.empty()) reportProblem("Warning: " + warning);
+    m_server->setCertificate(std::move(certificate));
 }
 
 void Daemon::listen() {

@@ -1,8 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include <cstdint>
 #include <memory>
 #include <string>
+#include <vector>
 
 #include "Framework/Requests/ProviderSession.h"
 #include "Host/Server/HttpServer.h"
@@ -29,6 +31,14 @@ class LockFile {
     const std::string m_path;
     os::FileLock m_lock;
 };
+
+/// What works, but hardly as it is meant: each says what to do. Plain HTTP on the network, and more
+/// connections than `descriptors` the process may have.
+std::vector<std::string> warningsOf(const Settings& settings, std::uint64_t descriptors);
+/// How many descriptors this process may have at most.
+std::uint64_t mostDescriptors();
+/// Has it have as many as the settings take, as far as that goes. Returns how many it may have then.
+std::uint64_t raiseDescriptors(const Settings& settings);
 
 /// Loads the provider libraries of a directory. One that does not load is reported, and the others serve.
 /// Throws std::runtime_error when the directory cannot be read, or none of its libraries is a provider.

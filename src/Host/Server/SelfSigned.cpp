@@ -6,6 +6,7 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <array>
 #include <cerrno>
 #include <cstring>
@@ -24,6 +25,8 @@ namespace fs = std::filesystem;
 
 constexpr std::time_t kDay = 24 * 60 * 60;
 constexpr std::time_t kLifetime = 3650 * kDay;
+/// 2025: before there was this program.
+constexpr std::time_t kTooEarly = 1735689600;
 
 void check(int status) {
     if (status < 0)
@@ -84,7 +87,8 @@ Certificate makeCertificate(gnutls_x509_privkey_t key) {
     // A day back: a client whose clock is a little behind takes it, too.
     const std::time_t now = std::time(nullptr);
     check(::gnutls_x509_crt_set_activation_time(raw, now - kDay));
-    check(::gnutls_x509_crt_set_expiration_time(raw, now + kLifetime));
+    // On a machine that does not know the time yet, it must outlive the day on which it learns that.
+    check(::gnutls_x509_crt_set_expiration_time(raw, std::max(now, kTooEarly) + kLifetime));
     check(::gnutls_x509_crt_set_key(raw, key));
     check(::gnutls_x509_crt_set_basic_constraints(raw, 0, -1));
     check(::gnutls_x509_crt_set_key_usage(raw, GNUTLS_KEY_DIGITAL_SIGNATURE));
@@ -118,27 +122,71 @@ void writePem(const std::string& path, const Object& object, Export&& exporter, 
     writeFile(path, pem, mode);
 }
 
+/// Nothing for a file that cannot be read or is no certificate, which is not ours then.
+Certificate readCertificate(const std::string& file) {
+    gnutls_datum_t pem{nullptr, 0};
+    gnutls_x509_crt_t raw = nullptr;
+    if (::gnutls_load_file(file.c_str(), &pem) != 0 || ::gnutls_x509_crt_init(&raw) != 0) return nullptr;
+    const std::unique_ptr<unsigned char, void (*)(void*)> holder(pem.data, ::gnutls_free);
+    Certificate certificate(raw);
+    return ::gnutls_x509_crt_import(raw, &pem, GNUTLS_X509_FMT_PEM) == 0 ? std::move(certificate) : nullptr;
+}
+
+Key readKey(const std::string& file) {
+    gnutls_datum_t pem{nullptr, 0};
+    check(::gnutls_load_file(file.c_str(), &pem));
+    const std::unique_ptr<unsigned char, void (*)(void*)> holder(pem.data, ::gnutls_free);
+    gnutls_x509_privkey_t raw = nullptr;
+    check(::gnutls_x509_privkey_init(&raw));
+    Key key(raw);
+    check(::gnutls_x509_privkey_import(raw, &pem, GNUTLS_X509_FMT_PEM));
+    return key;
+}
+
+bool mayMake(const TlsSettings& settings) {
+    const TlsSettings defaults;
+    return settings.generate ||
+           (settings.certificate == defaults.certificate && settings.key == defaults.key);
+}
+
 }  // namespace
+
+bool isCertificateToBeRenewed(const TlsSettings& settings) {
+    if (!mayMake(settings)) return false;
+    const Certificate certificate = readCertificate(settings.certificate);
+    if (!certificate) return false;
+    const std::time_t from = ::gnutls_x509_crt_get_activation_time(certificate.get());
+    const std::time_t until = ::gnutls_x509_crt_get_expiration_time(certificate.get());
+    // Its very lifetime shows that it is one of ours, and not one that the administrator put there.
+    // A time before 1970 cannot be read back.
+    return (from <= 0 || (from < kTooEarly && until - from == kLifetime + kDay)) && until < std::time(nullptr);
+}
 
 bool areTlsFilesToBeMade(const TlsSettings& settings) {
     std::error_code unreadable;  // counts as missing here; reading it says why
     const bool hasCertificate = fs::exists(settings.certificate, unreadable);
     const bool hasKey = fs::exists(settings.key, unreadable);
     if (hasCertificate && hasKey) return false;
-    const TlsSettings defaults;
-    const bool mayMake =
-        settings.generate || (settings.certificate == defaults.certificate && settings.key == defaults.key);
-    if (mayMake && !hasCertificate && !hasKey) return true;
+    if (mayMake(settings) && !hasCertificate && !hasKey) return true;
     const std::string missing =
         hasCertificate ? "tls.key is " + settings.key : "tls.certificate is " + settings.certificate;
     throw std::runtime_error(missing + ", which does not exist. " +
-                             (mayMake
+                             (mayMake(settings)
                                   ? "Restore it, or remove " +
                                         (hasKey ? settings.key : settings.certificate) + " to have both made."
                                   : "Correct the path, or set tls.generate = true to have it made."));
 }
 
 bool makeTlsFiles(const TlsSettings& settings) {
+    if (isCertificateToBeRenewed(settings)) {
+        const Key key = readKey(settings.key);
+        const std::string fresh = settings.certificate + ".new";
+        ::unlink(fresh.c_str());
+        writePem(fresh, makeCertificate(key.get()).get(), ::gnutls_x509_crt_export2, 0644);
+        if (::rename(fresh.c_str(), settings.certificate.c_str()) != 0)
+            failToWrite(settings.certificate, std::strerror(errno));
+        return true;
+    }
     if (!areTlsFilesToBeMade(settings)) return false;
     for (const std::string& file : {settings.certificate, settings.key}) {
         std::error_code error;

@@ -1,10 +1,13 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Host/Server/ServerCertificate.h"
 
+#include <sys/stat.h>
+
 #include <array>
 #include <cerrno>
 #include <cstdint>
 #include <cstring>
+#include <ctime>
 #include <memory>
 #include <stdexcept>
 #include <system_error>
@@ -42,6 +45,21 @@ gnutls_datum_t datumOf(std::string& text) {
     return {reinterpret_cast<unsigned char*>(text.data()), static_cast<unsigned int>(text.size())};
 }
 
+/// Whoever has the key can pose as this server. A group may have it: some systems keep one for keys.
+void requireNotPublic(const std::string& file) {
+    struct stat status {};
+    if (::stat(file.c_str(), &status) != 0 || (status.st_mode & (S_IROTH | S_IWOTH)) == 0) return;
+    throw std::runtime_error(file + ": everybody may read or change this private key. Run: chmod o= " + file +
+                             ", and replace the key if others use this machine.");
+}
+
+std::string dateOf(std::time_t time) {
+    std::tm utc{};
+    std::array<char, sizeof "9999-12-31"> text{};
+    if (::gmtime_r(&time, &utc) == nullptr) return "?";
+    return {text.data(), std::strftime(text.data(), text.size(), "%Y-%m-%d", &utc)};
+}
+
 using KeyId = std::array<unsigned char, 64>;
 
 KeyId idOf(gnutls_pubkey_t key, const std::string& file) {
@@ -56,7 +74,9 @@ KeyId idOf(gnutls_pubkey_t key, const std::string& file) {
 // The constructor that it calls first makes a whole object, so the destructor runs when a step fails.
 ServerCertificate::ServerCertificate(const std::string& certificateFile, const std::string& keyFile)
     : ServerCertificate() {
+    m_file = certificateFile;
     readChain(certificateFile);
+    requireNotPublic(keyFile);
     readKey(keyFile);
     checkPair(certificateFile, keyFile);
 }
@@ -83,6 +103,20 @@ void ServerCertificate::readKey(const std::string& file) {
     // Freed memory keeps what was in it, and may end up in a core file.
     ::gnutls_memset(pem.data(), 0, pem.size());
     check(status, file);
+}
+
+std::string ServerCertificate::warning() const {
+    gnutls_x509_crt_t raw = nullptr;
+    check(::gnutls_pcert_export_x509(const_cast<gnutls_pcert_st*>(m_chain), &raw), m_file);
+    const std::unique_ptr<std::remove_pointer_t<gnutls_x509_crt_t>, decltype(&::gnutls_x509_crt_deinit)> own(
+        raw, ::gnutls_x509_crt_deinit);
+    const std::time_t now = std::time(nullptr);
+    const std::time_t from = ::gnutls_x509_crt_get_activation_time(raw);
+    const std::time_t until = ::gnutls_x509_crt_get_expiration_time(raw);
+    if (from <= now && now <= until) return "";
+    return "The certificate " + m_file +
+           (now < from ? " is not valid before " + dateOf(from) : " has expired on " + dateOf(until)) +
+           ", so clients refuse it. Set the clock, or replace the certificate.";
 }
 
 void ServerCertificate::checkPair(const std::string& certificateFile, const std::string& keyFile) const {
