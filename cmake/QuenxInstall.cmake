@@ -3,7 +3,7 @@
 # themselves, so that an installation can be staged and moved.
 set(CMAKE_INSTALL_DEFAULT_DIRECTORY_PERMISSIONS  # whatever the mask of whoever installs
     OWNER_READ OWNER_WRITE OWNER_EXECUTE GROUP_READ GROUP_EXECUTE WORLD_READ WORLD_EXECUTE)
-set(quenx_libraries Quenx_Utils Quenx_CimFramework Quenx_MidAPI Quenx_CimSchema Quenx_SoftwareInventory Quenx_SoftwareUpdate)
+set(quenx_libraries Quenx_FileReader Quenx_Utils Quenx_CimFramework Quenx_MidAPI Quenx_CimSchema Quenx_SoftwareInventory Quenx_SoftwareUpdate)
 set_target_properties(${quenx_libraries} PROPERTIES INSTALL_RPATH "$ORIGIN")
 set_target_properties(quenxctl quenx-cimd PROPERTIES INSTALL_RPATH "$ORIGIN/../lib/quenx")
 install(TARGETS ${quenx_libraries} DESTINATION lib/quenx)

@@ -7,6 +7,7 @@
 
 #include "Utils/Exception.h"
 #include "Utils/Log.h"
+#include "Utils/Os/Linux/PatientReading.h"
 #include "Utils/Os/Linux/linux.h"
 #include "Utils/Utils.h"
 
@@ -56,10 +57,15 @@ bool Uri::IsUriSupported() const {
 }
 
 bool Uri::IsUriAccesible() const {
+    os::Patience patience;
+    return IsUriAccesible(patience);
+}
+
+bool Uri::IsUriAccesible(os::Patience& patience) const {
     if (!IsUriSupported() || m_scheme != SupportedURISchemes::File) return false;
     // Opened, not only looked at: a file that the service may not read is not accessible.
     try {
-        os::getFileSize(m_sourcePath);
+        os::getFileSize(m_sourcePath, patience);
         return true;
     } catch (...) {
         return false;

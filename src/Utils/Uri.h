@@ -6,6 +6,10 @@
 
 #include "Utils/Export.h"
 
+namespace os {
+struct Patience;
+}
+
 namespace utils {
 
 /// The location of an image: a scheme and a source path. Nothing is percent-decoded.
@@ -30,6 +34,7 @@ class QUENX_EXPORT Uri {
 
     /// True if it is a local file whose size can be had.
     bool IsUriAccesible() const;
+    bool IsUriAccesible(os::Patience& patience) const;
 
     std::string getSourcePath() const { return m_sourcePath; }
     SupportedURISchemes getScheme() const { return m_scheme; }

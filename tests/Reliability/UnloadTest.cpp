@@ -2,6 +2,7 @@
 // The provider's library goes while its jobs are running or finished, and comes back.
 #include <gtest/gtest.h>
 
+#include <filesystem>
 #include <thread>
 
 #include "Providers/SoftwareUpdate/HookedBackend.h"
@@ -171,6 +172,13 @@ TEST(HostOfCTest, UnloadsEitherProviderFirstWhileFlashesFailAndRequestsAreRefuse
 TEST(LibrariesTest, BindAllSymbolsWhenTheyAreLoaded) {
     for (const char* library : {QUENX_INVENTORY_LIBRARY, QUENX_UPDATE_LIBRARY})
         EXPECT_NE(outputOf({"readelf", "-d", library}).find("BIND_NOW"), std::string::npos) << library;
+}
+
+/// A thread in it may be held by a file system for longer than anything else is loaded.
+TEST(LibrariesTest, KeepTheReaderOfFilesMapped) {
+    const std::string reader =
+        std::filesystem::path(QUENX_UPDATE_LIBRARY).replace_filename("libQuenx_FileReader.so");
+    EXPECT_NE(outputOf({"readelf", "-d", reader}).find("NODELETE"), std::string::npos);
 }
 
 }  // namespace

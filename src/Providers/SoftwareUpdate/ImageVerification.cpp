@@ -2,7 +2,6 @@
 #include "Providers/SoftwareUpdate/ImageVerification.h"
 
 #include <optional>
-#include <span>
 
 #include "MidAPI/ma.h"
 #include "Providers/SoftwareUpdate/MethodResults.h"
@@ -10,6 +9,7 @@
 #include "Providers/SoftwareUpdate/Quenx_SoftwareInstallationService.h"
 #include "Providers/SoftwareUpdate/Quenx_SoftwareInstallationServiceCapabilities.h"
 #include "Utils/Log.h"
+#include "Utils/Os/Linux/PatientReading.h"
 #include "Utils/Os/Linux/SMASHv2Config.h"
 #include "Utils/Os/Linux/linux.h"
 #include "Utils/Uri.h"
@@ -83,22 +83,64 @@ std::vector<utils::FirmwareType> getTargetTypes(const std::vector<std::uint16_t>
 
 namespace {
 
-/// The local path that the URI names.
-std::string locate(const std::string& uri) {
-    utils::Uri parsed(uri);
-    if (!parsed.IsUriSupported()) throw EInvalidUri(utils::formatStr("URI: %s is invalid", uri.c_str()));
-    if (!parsed.IsUriAccesible()) throw EUriDoesNotExist(utils::formatStr("URI: %s is invalid", uri.c_str()));
-    return parsed.getSourcePath();
-}
+/// The file of an image, on a file system that may not answer.
+class ImageFile {
+  public:
+    ImageFile(const std::string& uri, const utils::ImageLimits& limits)
+        : m_uri(uri), m_limits(limits), m_patience(limits.silence) {}
 
-/// Reads the whole file that the URI names.
-Buffer readImage(const std::string& uri, const std::string& path, std::uint32_t size) {
-    Buffer source = std::make_unique_for_overwrite<std::uint8_t[]>(size);
-    // The file may have shrunk since it was measured.
-    if (os::readFile(path, std::span(source.get(), size)) != size)
-        throw EImageReadError(utils::formatStr("Image read error: %s (%s)", uri.c_str(), path.c_str()));
-    return source;
-}
+    /// Finds the local path that the URI names.
+    void locate() {
+        utils::Uri parsed(m_uri);
+        if (!parsed.IsUriSupported())
+            throw EInvalidUri(utils::formatStr("URI: %s is invalid", m_uri.c_str()));
+        m_path = parsed.getSourcePath();
+        if (parsed.IsUriAccesible(m_patience)) return;
+        refuseIfSilent();
+        throw EUriDoesNotExist(utils::formatStr("URI: %s is invalid", m_uri.c_str()));
+    }
+
+    /// The adapter API counts in 32 bits.
+    std::uint32_t measure() {
+        std::uint32_t size = 0;
+        try {
+            size = static_cast<std::uint32_t>(os::getFileSize(m_path, m_patience));
+        } catch (const utils::Exception&) {
+            refuseIfSilent();
+            throw;
+        }
+        if (m_limits.largest != 0 && size > m_limits.largest) {
+            QUENX_ERROR("%s has %u bytes, more than the %u that LargestImage allows", m_path.c_str(), size,
+                        m_limits.largest);
+            refuse();
+        }
+        return size;
+    }
+
+    Buffer read(std::uint32_t size) {
+        std::optional<os::FileContent> content = os::readFile(m_path, size, m_patience);
+        refuseIfSilent();
+        // The file may have shrunk since it was measured.
+        if (!content || content->count != size) refuse();
+        return std::move(content->bytes);
+    }
+
+  private:
+    [[noreturn]] void refuse() const {
+        throw EImageReadError(utils::formatStr("Image read error: %s (%s)", m_uri.c_str(), m_path.c_str()));
+    }
+    void refuseIfSilent() const {
+        if (!m_patience.isOver) return;
+        QUENX_ERROR("%s is not read: its file system did not answer for %d seconds, now or earlier",
+                    m_path.c_str(), static_cast<int>(m_limits.silence.count()));
+        refuse();
+    }
+
+    const std::string& m_uri;
+    const utils::ImageLimits m_limits;
+    os::Patience m_patience;
+    std::string m_path;
+};
 
 [[noreturn]] void refuseWithoutForce(const std::string& uri) {
     throw EDowngradeDetected(
@@ -149,11 +191,11 @@ void judge(int status, bool force, const std::string& uri, const std::string& ad
 PreparedImage readAndPrepare(const UpdateOrder& order, bool& isAskingAdapter) {
     const auto& [adapterName, uri, options, values] = order;
     utils::formatDebugLog(__FILE__, kCheckAndVerifyImage, __LINE__, "Checking URI : '%s' ", uri.c_str());
-    const std::string path = locate(uri);
+    ImageFile file(uri, utils::AutoSingleton<utils::SMASHv2Config>::getInstance()->getImageLimits());
+    file.locate();
     // Measured once: buffers, reading and preparation must agree on one size, whatever happens to the file.
-    // The adapter API counts in 32 bits.
-    const auto fileSize = static_cast<std::uint32_t>(os::getFileSize(path));
-    const Buffer source = readImage(uri, path, fileSize);
+    const std::uint32_t fileSize = file.measure();
+    const Buffer source = file.read(fileSize);
     Buffer image = std::make_unique_for_overwrite<std::uint8_t[]>(fileSize);
     std::uint32_t imageSize = fileSize;
     std::vector<utils::FirmwareType> types = getTargetTypes(options, values);

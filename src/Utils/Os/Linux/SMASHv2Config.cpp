@@ -29,6 +29,9 @@ namespace {
 
 constexpr const char* kConfigurationFile = "/etc/quenx-cimprovider.conf";
 constexpr const char* kReleaseClaimKey = "ReleaseClaimAfterCheck";
+constexpr const char* kImageReadTimeoutKey = "ImageReadTimeout";
+constexpr std::uint32_t kMaxImageReadTimeout = 86400;
+constexpr const char* kLargestImageKey = "LargestImage";
 constexpr std::string_view kRootNamespace = "root";
 // The lines of a reading pass name the operation as a whole.
 constexpr const char* kReadingFunction = "initialize";
@@ -94,6 +97,12 @@ bool SMASHv2Config::getReleaseClaimAfterCheck() {
     return m_releaseClaimAfterCheck;
 }
 
+ImageLimits SMASHv2Config::getImageLimits() {
+    initialize();
+    Mutex::AutoLocker locker(m_mutex);
+    return m_imageLimits;
+}
+
 void SMASHv2Config::initialize() {
     Mutex::AutoLocker locker(m_mutex);
     try {
@@ -146,6 +155,13 @@ void SMASHv2Config::takeWord(const std::string& key, std::string word) {
         m_releaseClaimAfterCheck = word == "1";
         formatDebugLog(__FILE__, kReadingFunction, __LINE__, "Read ReleaseClaimAfterCheck : %d",
                        m_releaseClaimAfterCheck);
+    } else if (key == kImageReadTimeoutKey) {
+        std::uint32_t seconds = 0;
+        if (!toUint(word, seconds) || seconds == 0 || seconds > kMaxImageReadTimeout) return;
+        m_imageLimits.silence = std::chrono::seconds(seconds);
+        formatDebugLog(__FILE__, kReadingFunction, __LINE__, "Read ImageReadTimeout : %u", seconds);
+    } else if (key == kLargestImageKey && toUint(word, m_imageLimits.largest)) {
+        formatDebugLog(__FILE__, kReadingFunction, __LINE__, "Read LargestImage : %u", m_imageLimits.largest);
     }
 }
 

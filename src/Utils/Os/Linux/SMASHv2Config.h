@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include <chrono>
 #include <cstdint>
 #include <memory>
 #include <string>
@@ -23,6 +24,12 @@ QUENX_EXPORT extern const char* const SMASHv2_FWFILE_PATH_KEY;
 QUENX_EXPORT extern const std::int32_t m_OEMCustomizationValues[1];
 
 namespace utils {
+
+/// Bounds for reading an image.
+struct ImageLimits {
+    std::chrono::seconds silence{30};  ///< the longest wait for its file system to answer
+    std::uint32_t largest = 0;         ///< bytes; 0 for no bound
+};
 
 /// The settings of /etc/quenx-cimprovider.conf. Every getter reads the file again, so an edited file takes
 /// effect at the next query. A setting that is missing or malformed keeps the value last read; the list of
@@ -51,6 +58,9 @@ class QUENX_EXPORT SMASHv2Config : public AutoSingleton<SMASHv2Config> {
     /// `create`, and a failure that is not a refusal.
     bool getReleaseClaimAfterCheck();
 
+    /// How images are read (keys ImageReadTimeout, whole seconds, 1 to 86400, and LargestImage, bytes).
+    ImageLimits getImageLimits();
+
     static const char* GetSingletonName() { return "SMASHv2Config"; }
     static std::unique_ptr<SMASHv2Config> CreateSingleton();
 
@@ -66,6 +76,7 @@ class QUENX_EXPORT SMASHv2Config : public AutoSingleton<SMASHv2Config> {
     bool m_downgradeBlocked QUENX_GUARDED_BY(m_mutex) = false;
     StringArray m_firmwarePaths QUENX_GUARDED_BY(m_mutex);
     bool m_releaseClaimAfterCheck QUENX_GUARDED_BY(m_mutex) = false;
+    ImageLimits m_imageLimits QUENX_GUARDED_BY(m_mutex);
 };
 
 extern template class Singleton<SMASHv2Config>;

@@ -17,6 +17,7 @@
 
 #include "Utils/Exception.h"
 #include "Utils/Log.h"
+#include "Utils/Os/Linux/PatientReading.h"
 #include "Utils/Utils.h"
 
 namespace os {
@@ -31,10 +32,6 @@ using Directory = std::unique_ptr<DIR, CloseDirectory>;
 /// A FIFO that took the file's place after the look at it must not block the opening.
 int openForReading(const std::string& path) noexcept {
     return open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK | O_NOCTTY);
-}
-
-bool isReadableKind(const struct stat& status) noexcept {
-    return S_ISDIR(status.st_mode) || (S_ISREG(status.st_mode) && status.st_size <= INT32_MAX);
 }
 
 /// Fills the buffer as far as the file goes; returns 0, or the errno value of what stopped it.
@@ -72,22 +69,19 @@ std::string getHostname() {
 }
 
 std::int32_t getFileSize(const std::string& path) {
-    struct stat status {};
-    // A path with a NUL in it names nothing, and must not open what its head names.
-    if (path.find('\0') != std::string::npos) failToOpen(path);
-    // Told before the opening: to open a device can rewind a tape or reset a modem.
-    if (stat(path.c_str(), &status) != 0 || !isReadableKind(status)) failToOpen(path);
-    const Descriptor file(openForReading(path));
-    // A process without standard input gets number 0 here, and counts as one that cannot open files.
-    if (file.number() <= 0) failToOpen(path);
-    if (fstat(file.number(), &status) != 0) {
+    Patience patience;
+    return getFileSize(path, patience);
+}
+
+std::int32_t getFileSize(const std::string& path, Patience& patience) {
+    const std::optional<FileMeasure> found = measureFile(path, patience);
+    if (found && found->kind == FileKind::CannotBeLookedAt)
         throw utils::Exception(utils::formatStr("Could not get info about the file %s", path.c_str()));
-    }
-    if (S_ISDIR(status.st_mode)) {
+    if (found && found->kind == FileKind::Directory) {
         throw utils::Exception(utils::formatStr("The specyfied URI %s points to a directory", path.c_str()));
     }
-    if (!isReadableKind(status)) failToOpen(path);
-    const auto size = static_cast<std::int32_t>(status.st_size);
+    if (!found || found->kind != FileKind::Regular || found->size > INT32_MAX) failToOpen(path);
+    const auto size = static_cast<std::int32_t>(found->size);
     QUENX_DEBUG("Output size of file: %d", size);
     return size;
 }

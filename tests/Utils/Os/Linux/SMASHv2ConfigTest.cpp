@@ -72,6 +72,17 @@ TEST_F(SMASHv2ConfigTest, KeepsTheValueOfARemovedKeyAndTheBanOnDowngrades) {
     EXPECT_FALSE(config.getReleaseClaimAfterCheck());
 }
 
+TEST_F(SMASHv2ConfigTest, BoundsTheReadingOfImages) {
+    const auto limits = [this](const std::string& lines) {
+        write(lines);
+        const utils::ImageLimits found = config.getImageLimits();
+        return std::to_string(found.silence.count()) + " s, " + std::to_string(found.largest) + " bytes";
+    };
+    EXPECT_EQ(limits(""), "30 s, 0 bytes");
+    EXPECT_EQ(limits("ImageReadTimeout=0\nImageReadTimeout=86401\nLargestImage=1M\n"), "30 s, 0 bytes");
+    EXPECT_EQ(limits("ImageReadTimeout=5\nLargestImage=1048576\n"), "5 s, 1048576 bytes");
+}
+
 TEST_F(SMASHv2ConfigTest, BuildsDirectoriesAnewFromEveryLine) {
     const std::string one = folder / "one", two = folder / "two", three = folder / "three";
     for (const std::string& path : {one, two, three})

@@ -1,0 +1,219 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "Utils/Os/Linux/PatientReading.h"
+
+#include <fcntl.h>
+#include <pthread.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <cerrno>
+#include <condition_variable>
+#include <csignal>
+#include <filesystem>
+#include <mutex>
+#include <utility>
+
+#include "Utils/Os/Linux/linux.h"
+
+namespace os {
+
+namespace {
+
+using Clock = std::chrono::steady_clock;
+using std::chrono::milliseconds;
+
+constexpr std::size_t kStep = std::size_t{64} * 1024;
+constexpr milliseconds kFree(1000);  // a slow medium is not a silent one
+constexpr milliseconds kLook(100);   // between two looks at a reader that works
+constexpr unsigned int kMaxLeftBehind = 16;
+
+/// One file, looked at and perhaps read on a thread of its own.
+struct Reading {
+    std::string path;
+    std::string key;       ///< one for all spellings of the path
+    std::size_t size = 0;  ///< how much to read; 0 to look only
+    FileMeasure measure{};
+    FileContent content{};
+    std::atomic<std::uint64_t> steps = 0;
+    bool isDone = false;
+    bool isLeftBehind = false;
+    Reading* next = nullptr;  ///< in the list of those under way
+};
+
+/// All readings under way. Never destroyed: a thread that was left behind may end after everything else.
+struct Readings {
+    std::mutex mutex;
+    std::condition_variable changed;
+    Reading* first = nullptr;
+    unsigned int leftBehind = 0;
+
+    static Readings& all() {
+        static Readings& readings = *new Readings;
+        return readings;
+    }
+    const Reading* find(const std::string& key) const {
+        const Reading* each = first;
+        while (each != nullptr && each->key != key)
+            each = each->next;
+        return each;
+    }
+    void add(Reading& reading) { reading.next = std::exchange(first, &reading); }
+    void remove(const Reading& reading) {
+        Reading** link = &first;
+        while (*link != &reading)
+            link = &(*link)->next;
+        *link = reading.next;
+    }
+};
+
+void reached(Reading& reading) {
+    ++reading.steps;
+    if (const auto test = beforeFileAccess.load()) test(reading.path);
+}
+
+FileMeasure kindOf(const struct stat& status) {
+    if (S_ISDIR(status.st_mode)) return {FileKind::Directory, 0};
+    if (S_ISREG(status.st_mode)) return {FileKind::Regular, status.st_size};
+    return {};
+}
+
+void readFrom(int file, Reading& reading) {
+    FileContent& content = reading.content;
+    while (content.count < reading.size) {
+        reached(reading);
+        const ssize_t got =
+            ::read(file, content.bytes.get() + content.count, std::min(kStep, reading.size - content.count));
+        if (got < 0 && errno == EINTR) continue;
+        if (got <= 0) return;
+        content.count += static_cast<std::size_t>(got);
+    }
+}
+
+void carryOut(Reading& reading) {
+    struct stat status {};
+    // A path with a NUL in it names nothing, and must not open what its head names.
+    if (reading.path.find('\0') != std::string::npos) return;
+    reached(reading);
+    // Told before the opening: to open a device can rewind a tape or reset a modem.
+    if (::stat(reading.path.c_str(), &status) != 0) return;
+    if (kindOf(status).kind == FileKind::CannotBeOpened) return;
+    reached(reading);
+    // A FIFO that took the file's place after the look at it must not block the opening.
+    const Descriptor file(::open(reading.path.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK | O_NOCTTY));
+    // A process without standard input gets number 0 here, and counts as one that cannot open files.
+    if (file.number() <= 0) return;
+    const bool isKnown = ::fstat(file.number(), &status) == 0;
+    reading.measure = isKnown ? kindOf(status) : FileMeasure{FileKind::CannotBeLookedAt, 0};
+    if (reading.measure.kind == FileKind::Regular) readFrom(file.number(), reading);
+}
+
+void* readerThread(void* argument) {
+    auto* reading = static_cast<Reading*>(argument);
+    carryOut(*reading);
+    Readings& readings = Readings::all();
+    const std::lock_guard lock(readings.mutex);
+    reading->isDone = true;
+    readings.changed.notify_all();
+    if (!reading->isLeftBehind) return nullptr;
+    readings.remove(*reading);
+    --readings.leftBehind;
+    delete reading;
+    return nullptr;
+}
+
+/// 0, or the errno value. The thread gets no signals, which belong to those of the hosting program.
+int startThread(pthread_t& thread, Reading& reading) {
+    sigset_t signals;
+    ::sigfillset(&signals);
+    for (const int fault : {SIGSEGV, SIGBUS, SIGFPE, SIGILL, SIGTRAP, SIGABRT, SIGSYS, SIGPROF})
+        ::sigdelset(&signals, fault);
+    sigset_t before;
+    ::pthread_sigmask(SIG_BLOCK, &signals, &before);
+    const int error = ::pthread_create(&thread, nullptr, &readerThread, &reading);
+    ::pthread_sigmask(SIG_SETMASK, &before, nullptr);
+    return error;
+}
+
+/// Waits until `isEnough` says so, or for too long; false then. A silence ends whenever `steps` moves.
+template <typename Condition, typename Steps>
+bool waitFor(std::unique_lock<std::mutex>& lock, Patience& patience, Condition isEnough, Steps steps) {
+    auto since = Clock::now();
+    std::uint64_t seen = steps();
+    for (;;) {
+        const bool isDone = isEnough();
+        const std::uint64_t moved = steps();
+        const auto now = Clock::now();
+        const auto silence = std::chrono::duration_cast<milliseconds>(now - since);
+        if (isDone || moved != seen) {
+            if (silence > kFree) patience.left -= silence;
+            seen = moved;
+            since = now;
+        }
+        if (isDone) return true;
+        if (silence >= std::min(patience.silence, std::max(patience.left, kFree))) return false;
+        Readings::all().changed.wait_until(lock, now + kLook);
+    }
+}
+
+/// False when the reading was given up, which then belongs to its thread.
+bool carryOutPatiently(std::unique_ptr<Reading>& reading, Patience& patience) {
+    Readings& readings = Readings::all();
+    std::unique_lock lock(readings.mutex);
+    // One reader a file: whatever asks for a file that hangs must not leave ever more of them behind.
+    const auto other = [&] { return readings.find(reading->key); };
+    const bool isFree = waitFor(
+        lock, patience, [&] { return other() == nullptr || other()->isLeftBehind; },
+        [&] { return other() == nullptr ? 0 : other()->steps.load(); });
+    patience.isOver = !isFree || other() != nullptr || readings.leftBehind >= kMaxLeftBehind;
+    if (patience.isOver) return false;
+    pthread_t thread{};
+    if (startThread(thread, *reading) != 0) {
+        // A process that gets no threads can still update its adapters.
+        lock.unlock();
+        carryOut(*reading);
+        return true;
+    }
+    readings.add(*reading);
+    const bool isDone = waitFor(
+        lock, patience, [&] { return reading->isDone; }, [&] { return reading->steps.load(); });
+    if (isDone) {
+        readings.remove(*reading);
+        readings.changed.notify_all();
+        lock.unlock();
+        ::pthread_join(thread, nullptr);
+        return true;
+    }
+    patience.isOver = true;
+    reading.release()->isLeftBehind = true;
+    ++readings.leftBehind;
+    ::pthread_detach(thread);
+    return false;
+}
+
+std::unique_ptr<Reading> makeReading(const std::string& path) {
+    auto reading = std::make_unique<Reading>();
+    reading->path = path;
+    reading->key = std::filesystem::path(path).lexically_normal();
+    return reading;
+}
+
+}  // namespace
+
+std::atomic<void (*)(const std::string& path)> beforeFileAccess = nullptr;
+
+std::optional<FileMeasure> measureFile(const std::string& path, Patience& patience) {
+    std::unique_ptr<Reading> reading = makeReading(path);
+    if (!carryOutPatiently(reading, patience)) return std::nullopt;
+    return reading->measure;
+}
+
+std::optional<FileContent> readFile(const std::string& path, std::size_t size, Patience& patience) {
+    std::unique_ptr<Reading> reading = makeReading(path);
+    reading->size = size;
+    reading->content.bytes = std::make_unique_for_overwrite<std::uint8_t[]>(size);
+    if (!carryOutPatiently(reading, patience)) return std::nullopt;
+    return std::move(reading->content);
+}
+
+}  // namespace os

@@ -1,0 +1,113 @@
+// SPDX-License-Identifier: Apache-2.0
+// The file system of the image stops answering.
+#include <condition_variable>
+#include <mutex>
+#include <thread>
+
+#include "Providers/SoftwareUpdate/UpdateTest.h"
+#include "Reliability/Effort.h"
+#include "Utils/Os/Linux/PatientReading.h"
+
+namespace {
+
+/// Counts the accesses to one path, and holds one of them until the end of the scope, or until answer().
+class HungFileSystem {
+  public:
+    explicit HungFileSystem(const std::string& path, int heldAccess = 0) {
+        m_path = path;
+        m_heldAccess = heldAccess;
+        m_accesses = 0;
+        os::beforeFileAccess = &HungFileSystem::access;
+    }
+    HungFileSystem(const HungFileSystem&) = delete;
+    HungFileSystem& operator=(const HungFileSystem&) = delete;
+    ~HungFileSystem() {
+        answer();
+        os::beforeFileAccess = nullptr;
+    }
+    static int accesses() {
+        const std::lock_guard lock(m_mutex);
+        return m_accesses;
+    }
+    static void answer() {
+        const std::lock_guard lock(m_mutex);
+        m_heldAccess = 0;
+        m_answered.notify_all();
+    }
+
+  private:
+    static void access(const std::string& path) {
+        std::unique_lock lock(m_mutex);
+        if (path != m_path) return;
+        const int number = ++m_accesses;
+        m_answered.wait(lock, [number] { return m_heldAccess != number; });
+    }
+
+    static inline std::mutex m_mutex;
+    static inline std::condition_variable m_answered;
+    static inline std::string m_path;
+    static inline int m_heldAccess = 0;
+    static inline int m_accesses = 0;
+};
+
+class HungFileTest : public test::UpdateTest {
+  protected:
+    const std::string m_uri = goodImage();
+    const std::string m_path = m_uri.substr(std::string("file://").size());
+};
+
+TEST_F(HungFileTest, EndsTheUpdateAsAReadErrorAndLetsOthersGoOn) {
+    m_folder.write("quenx.conf", "ImageReadTimeout=1\n");
+    // The first look at it, the second one's opening, the reading.
+    for (const int held : {1, 4, 7}) {
+        SCOPED_TRACE(held);
+        const HungFileSystem files(m_path, held);
+        test::SyslogCapture::clear();
+        EXPECT_EQ(install(m_uri, "eth0").returnValue, 2U);
+        EXPECT_TRUE(test::SyslogCapture::contains("Image read error: " + m_uri + " (" + m_path + ")"));
+        EXPECT_TRUE(test::SyslogCapture::contains("did not answer for 1 seconds"));
+        EXPECT_EQ(claim(), "");
+        // Nobody asks again, by whatever name, while the first one hangs.
+        const int accesses = HungFileSystem::accesses();
+        EXPECT_EQ(accesses, held);
+        EXPECT_EQ(install("file:///." + m_path, "eth0").returnValue, 2U);
+        EXPECT_EQ(HungFileSystem::accesses(), accesses);
+        EXPECT_EQ(install(file("other.rom", test::readTestFile(m_path)), "eth0").returnValue, 4096U);
+        deleteJobs();
+
+        HungFileSystem::answer();
+        while (install(m_uri, "eth0").returnValue != 4096U)
+            std::this_thread::yield();
+        deleteJobs();
+        test::count("images on a file system that hung");
+    }
+}
+
+TEST_F(HungFileTest, ReadsNoImageThatIsLargerThanAllowed) {
+    const std::string length = std::to_string(test::readTestFile(m_path).size());
+    const HungFileSystem files(m_path);
+    m_folder.write("quenx.conf", "LargestImage=512\n");
+    EXPECT_EQ(install(m_uri, "eth0").returnValue, 2U);
+    EXPECT_EQ(HungFileSystem::accesses(), 4) << "it was read";
+    EXPECT_EQ(claim(), "");
+    EXPECT_TRUE(test::SyslogCapture::contains(m_path + " has " + length + " bytes, more than the 512"));
+    m_folder.write("quenx.conf", "LargestImage=" + length + "\n");
+    EXPECT_EQ(install(m_uri, "eth0").returnValue, 4096U);
+}
+
+TEST(PatienceTest, EndsWhenManySilencesTogetherAreTooLong) {
+    const test::TempFolder folder;
+    const std::string path = folder.write("slow", std::string(20 * 64 * 1024, 'x'));
+    os::beforeFileAccess = [](const std::string&) {
+        std::this_thread::sleep_for(std::chrono::milliseconds(1100));
+    };
+    os::Patience patience(std::chrono::seconds(2));
+    EXPECT_FALSE(os::readFile(path, 20 * 64 * 1024, patience));
+    EXPECT_TRUE(patience.isOver);
+    os::beforeFileAccess = nullptr;
+    os::Patience fresh;
+    while (!os::readFile(path, 5, fresh))
+        std::this_thread::yield();
+}
+
+}  // namespace
