@@ -14,12 +14,13 @@ configure_file(packaging/quenx-cimd.service.in ${CMAKE_BINARY_DIR}/quenx-cimd.se
 install(FILES ${CMAKE_BINARY_DIR}/quenx-cimd.service DESTINATION lib/systemd/system)
 install(DIRECTORY docs/ DESTINATION share/doc/quenx)
 install(FILES CHANGELOG.md LICENSE DESTINATION share/doc/quenx)
-install(FILES packaging/adapters.toml packaging/quenx-cimd.toml DESTINATION share/doc/quenx/examples)
+install(FILES packaging/adapters.toml packaging/quenx-cimd.toml packaging/quenx-cimprovider.conf
+    DESTINATION share/doc/quenx/examples)
 
 # Configuration goes below the prefix, for /usr to /etc. With another prefix PAM still reads /etc alone: set this to it.
 set(CMAKE_INSTALL_SYSCONFDIR etc CACHE PATH "Where configuration is installed, relative to the prefix or absolute")
 install(DIRECTORY packaging/pam.d DESTINATION share/doc/quenx/examples)
 install(CODE "set(quenx_sysconfdir \"${CMAKE_INSTALL_SYSCONFDIR}\")
 set(quenx_configuration_source \"${PROJECT_SOURCE_DIR}/packaging\")
-set(quenx_configuration_files pam.d/quenx-cimd)
+set(quenx_configuration_files pam.d/quenx-cimd quenx-cimprovider.conf)
 include(\"${PROJECT_SOURCE_DIR}/cmake/QuenxInstallConfiguration.cmake\")")

@@ -13,6 +13,7 @@
 
 #include "Cli/Arguments.h"
 #include "Cli/Display/Output.h"
+#include "Utils/Os/Linux/linux.h"
 
 namespace cli {
 
@@ -129,6 +130,7 @@ ExitStatus runAndReport(int argc, char** argv, std::optional<Arguments>& argumen
 }  // namespace cli
 
 int main(int argc, char** argv) {
+    os::openStandardDescriptors();
     std::optional<cli::Arguments> arguments;
     cli::ExitStatus status = cli::runAndReport(argc, argv, arguments);
     // A result that nobody can read is a failure; an update, though, has happened whether or not anybody

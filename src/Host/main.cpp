@@ -8,6 +8,7 @@
 #include "Host/Daemon/CommandLine.h"
 #include "Host/Daemon/Daemon.h"
 #include "Host/Daemon/Report.h"
+#include "Utils/Os/Linux/linux.h"
 
 namespace {
 
@@ -19,8 +20,10 @@ class Signals {
         for (const int signal : {SIGTERM, SIGINT, SIGHUP})
             ::sigaddset(&m_set, signal);
         ::pthread_sigmask(SIG_BLOCK, &m_set, nullptr);
-        // A client that goes away while it is answered must not end the daemon.
-        (void)std::signal(SIGPIPE, SIG_IGN);
+        // A client that goes away while it is answered must not end the daemon, nor a signal that means
+        // nothing here, in the middle of a flash.
+        for (const int signal : {SIGPIPE, SIGUSR1, SIGUSR2, SIGALRM, SIGVTALRM, SIGPROF, SIGIO, SIGPWR})
+            (void)std::signal(signal, SIG_IGN);
     }
 
     int wait() const {
@@ -86,6 +89,7 @@ int run(const host::Settings& settings) {
 }  // namespace
 
 int main(int argc, char** argv) {
+    os::openStandardDescriptors();
     const host::CommandLine command = host::readCommandLine(argc, argv);
     if (command.exitStatus) return *command.exitStatus;
     if (command.passwd) return host::runPasswd(*command.passwd);

@@ -22,12 +22,12 @@ TimeStamp::TimeStamp(std::string name, bool logStart) : m_name(std::move(name)) 
 }
 
 void TimeStamp::Init(bool logStart) {
-    m_start = os::getuSecondsSinceEpoch();
+    m_start = os::getMonotonicuSeconds();
     if (logStart) QUENX_DEBUG("<%s>", m_name.c_str());
 }
 
 TimeStamp::~TimeStamp() {
-    const std::uint64_t milliseconds = (os::getuSecondsSinceEpoch() - m_start) / 1000;
+    const std::uint64_t milliseconds = (os::getMonotonicuSeconds() - m_start) / 1000;
     // Log readers know this as a signed number of 32 bits.
     QUENX_DEBUG("time(%s) = %dms ", m_name.c_str(), static_cast<std::int32_t>(milliseconds));
 }

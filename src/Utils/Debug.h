@@ -26,7 +26,7 @@ class QUENX_EXPORT TimeStamp {
     void Init(bool logStart);
 
     std::string m_name;
-    std::uint64_t m_start = 0;  ///< microseconds since the epoch
+    std::uint64_t m_start = 0;  ///< microseconds of the monotonic clock
 };
 
 }  // namespace utils

@@ -259,6 +259,7 @@ TEST(ConfigCheckTest, LooksAtEveryFile) {
         {2, certificate, key, {"--adapters-description", noAdapters, "--adapters-state", junk + "/state"}},
         {2, certificate, otherKey, {}},
         {2, certificate, junk, {}},
+        {2, certificate, "/dev/zero", {}},
         {2, certificate, folder / "none", {"--tls-generate"}},
         {2, folder / "none", key, {}},
         {2, junk, key, {}},

@@ -5,11 +5,14 @@
 //
 //   HostOfC ONE OTHER STARTER CLOSED flash URI   unloads while the flash runs
 //   HostOfC ONE OTHER STARTER CLOSED calls URI   unloads while many threads call, wrongly
+//   HostOfC ONE OTHER STARTER CLOSED leave URI   the main thread leaves while the flash runs
+//   HostOfC ONE OTHER STARTER CLOSED fork URI    the same, after a child has ended
 #include <dlfcn.h>
 #include <pthread.h>
 #include <stdio.h>
 #include <stdlib.h>
 #include <string.h>
+#include <sys/wait.h>
 #include <unistd.h>
 
 namespace {
@@ -57,6 +60,21 @@ int main(int argc, char** argv) {
     for (int i = 0; calls && i < kThreads; ++i)
         pthread_create(&threads[i], nullptr, callWrongly, nullptr);
     if (!calls && startFlash(argv[6]) != 1) return 3;
+    const bool forks = strcmp(argv[5], "fork") == 0;
+    const bool isLeaving = forks || strcmp(argv[5], "leave") == 0;
+    if (forks) {
+        int status = 0;
+        fflush(stdout);
+        const pid_t child = fork();
+        if (child == 0) {
+            alarm(kHangsAfterSeconds);
+            exit(0);
+        }
+        waitpid(child, &status, 0);
+        printf("child: %d\n", status);
+    }
+    // The worker is the last thread then, and what it runs into is the end of the process.
+    if (isLeaving) pthread_exit(nullptr);
     const int closedFirst = atoi(argv[4]);
     dlclose(providers[closedFirst]);
     report();

@@ -1,13 +1,16 @@
 // SPDX-License-Identifier: Apache-2.0
-// This program's own operator new and delete, and its pthread_create: they serve the shared libraries, too.
+// This program's own operator new and delete, pthread_create and gettimeofday: they serve the shared
+// libraries, too.
 #include "Reliability/Interposed.h"
 
 #include <dlfcn.h>
 #include <pthread.h>
+#include <sys/time.h>
 
 #include <cerrno>
 #include <cstddef>
 #include <cstdlib>
+#include <ctime>
 #include <new>
 
 #include "Utils/Export.h"
@@ -34,6 +37,7 @@ constexpr std::size_t kHeader = alignof(std::max_align_t);
 }  // namespace
 
 std::atomic<bool> refusesThreads{false};
+std::atomic<std::int64_t> clockOffset{0};
 
 std::int64_t liveBytes() {
     return live.load();
@@ -77,6 +81,14 @@ QUENX_EXPORT void operator delete(void* memory) noexcept {
 }
 QUENX_EXPORT void operator delete(void* memory, std::size_t) noexcept {
     operator delete(memory);
+}
+
+extern "C" QUENX_EXPORT int gettimeofday(timeval* now, void*) noexcept {
+    timespec time{};
+    clock_gettime(CLOCK_REALTIME, &time);
+    now->tv_sec = time.tv_sec + static_cast<std::time_t>(test::clockOffset);
+    now->tv_usec = time.tv_nsec / 1000;
+    return 0;
 }
 
 using Create = int(pthread_t*, const pthread_attr_t*, void* (*)(void*), void*);

@@ -23,6 +23,9 @@ class AllocationFailure {
     bool hasStruck() const;
 };
 
+/// Added to the time of day, in seconds.
+extern std::atomic<std::int64_t> clockOffset;
+
 /// While it is set, every new thread of the process is refused with EAGAIN.
 extern std::atomic<bool> refusesThreads;
 

@@ -168,6 +168,35 @@ TEST(HostOfCTest, UnloadsEitherProviderFirstWhileFlashesFailAndRequestsAreRefuse
     }
 }
 
+TEST(HostOfCTest, EndsWithItsLastThreadAndLetsAChildEndAtOnce) {
+    const test::TempFolder folder;
+    folder.write("adapters.toml", R"(
+        [[adapter]]
+        name = "eth0"
+        pci_address = "0000:03:00.0"
+        pci_id = "1af4:1041"
+        mac = "52:54:00:00:00:10"
+        components = [ { type = "IMG_PXE", revision = 1 }, { type = "IMG_UEFI", revision = 0 } ]
+        [[adapter.fault]]
+        at = "write"
+        action = "stall"
+        milliseconds = 300
+        )");
+    std::uint16_t revision = 1;
+    for (const auto& [use, said] : {std::pair("leave", ""), std::pair("fork", "child: 0\n")}) {
+        const auto rom = test::madeRom({{FirmwareType::PXE, ++revision}, {FirmwareType::UEFI, 1}});
+        EXPECT_EQ(
+            outputOf({"env", "QUENX_ADAPTERS=" + folder / "adapters.toml",
+                      "QUENX_ADAPTER_STATE=" + folder / "state", "sh", "-c", "\"$@\"; echo $?", "sh",
+                      QUENX_HOST_OF_C, QUENX_INVENTORY_LIBRARY, QUENX_UPDATE_LIBRARY, QUENX_FLASH_STARTER,
+                      "0", use, "file://" + folder.write("new.rom", std::span(rom))}),
+            std::string("2 agents, mapped: 1 1\n") + said + "0\n");
+        const ma::Simulator after(folder / "adapters.toml", folder / "state");
+        EXPECT_EQ(test::describeRom(after.flashContent("eth0")),
+                  "IMG_PXE " + std::to_string(revision) + ", IMG_UEFI 1");
+    }
+}
+
 /// A worker that binds a symbol late waits for the loader's lock, too.
 TEST(LibrariesTest, BindAllSymbolsWhenTheyAreLoaded) {
     for (const char* library : {QUENX_INVENTORY_LIBRARY, QUENX_UPDATE_LIBRARY})

@@ -5,10 +5,12 @@
 
 #include "Framework/Model/CimInstance.h"
 #include "Framework/Model/CimValue.h"
+#include "Utils/Os/Linux/linux.h"
 
 namespace core {
 
-CimAgent::CimAgent(std::string providerName) : m_providerName(std::move(providerName)) {
+CimAgent::CimAgent(std::string providerName)
+    : m_providerName(std::move(providerName)), m_forks(os::forkCount()) {
     // An agent of static storage that is never unloaded destroys its instances when the process exits.
     prepareReaper();
 }
@@ -40,6 +42,10 @@ void CimAgent::disableIndications(std::string className) {
 }
 
 void CimAgent::leaveBroker() noexcept {
+    if (m_forks != os::forkCount() && !GetCimBroker()->isUsedHere()) {
+        m_classes.abandon();
+        return;
+    }
     GetCimBroker()->removeAgent(this);
     m_classes.clear();
     // A deleted job may still be flashing, and its code is the library's that is about to unload.
@@ -71,7 +77,12 @@ void CimBroker::removeAgent(CimAgent* agent) noexcept {
         leaving->users.wait(users);
 }
 
+bool CimBroker::isUsedHere() const noexcept {
+    return m_usedAtForks == os::forkCount();
+}
+
 std::vector<AgentUse> CimBroker::useAgents() {
+    m_usedAtForks = os::forkCount();
     RequestScope* scope = RequestScope::current();
     // Counted under the lock: an agent that has left the list gets no new users, so its wait can end.
     const utils::Mutex::AutoLocker lock(m_mutex);

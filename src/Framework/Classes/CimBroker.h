@@ -33,13 +33,15 @@ class QUENX_EXPORT CimAgent {
     /// Takes the agent out of the broker, waits for the requests that use it, destroys its class objects and
     /// waits until every released instance is destroyed, so that its library can be unloaded. The most
     /// derived destructor calls it, before anything of the object is gone. Must not be called from within a
-    /// request.
+    /// request. A child of the process that built the agent, and which has not used any, leaves everything as
+    /// it is: the threads to wait for are not there, and locks may be held for ever.
     void leaveBroker() noexcept;
 
     CimClasses m_classes;
 
   private:
     std::string m_providerName;
+    unsigned int m_forks;  ///< os::forkCount() where it was built
 };
 
 /// Knows all agents of the process. Thread-safe.
@@ -64,11 +66,17 @@ class QUENX_EXPORT CimBroker {
     /// Takes the agent out and waits until nobody uses it. An agent that is not registered is ignored.
     void removeAgent(CimAgent* agent) noexcept;
 
+    /// Whether this process has used an agent. A child of one that has, has not yet.
+    bool isUsedHere() const noexcept;
+
     /// Every agent, each kept from leaving while its entry lives. With a request scope open on the calling
     /// thread the scope keeps them too, until it ends.
     std::vector<AgentUse> useAgents();
 
   private:
+    static constexpr unsigned int kNever = ~0U;
+
+    std::atomic<unsigned int> m_usedAtForks{kNever};  ///< os::forkCount() at the last use
     utils::Mutex m_mutex;
     std::vector<std::shared_ptr<AgentRegistration>> m_agents QUENX_GUARDED_BY(m_mutex);
 };

@@ -86,6 +86,8 @@ class QUENX_EXPORT CimClasses {
     std::vector<const ServedClass*> getAll() const;
     /// Destroys the class objects, the last one first.
     void clear();
+    /// Leaves them as they are, for ever, and takes no lock.
+    void abandon() noexcept;
 
   private:
     void append(ServedClass served);

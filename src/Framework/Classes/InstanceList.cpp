@@ -1,15 +1,18 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Framework/Classes/InstanceList.h"
 
+#include <pthread.h>
+
 #include <algorithm>
 #include <condition_variable>
 #include <cstdint>
-#include <exception>
 #include <mutex>
-#include <thread>
 
 #include "Framework/Classes/RequestScope.h"
 #include "Framework/Model/CimInstance.h"
+#include "Utils/Os/Linux/SignalsBlocked.h"
+#include "Utils/Os/Linux/Thread.h"
+#include "Utils/Os/Linux/linux.h"
 
 namespace core {
 
@@ -51,7 +54,8 @@ void holdInScope(std::shared_ptr<const void> object) {
 
 }  // namespace
 
-/// The queue of instances to destroy, and the one thread that destroys them. The queue is linked through the
+/// The queue of instances to destroy, and the one thread that destroys them, which ends when the queue is
+/// empty: a process whose main thread has left ends with its last thread. The queue is linked through the
 /// instances, so that queueing one never needs memory.
 class InstanceReaper {
   public:
@@ -61,18 +65,25 @@ class InstanceReaper {
 
     ~InstanceReaper() {
         drain();
-        {
-            const std::lock_guard lock(m_mutex);
-            m_ending = true;
-        }
-        m_changed.notify_all();
-        if (m_thread.joinable()) m_thread.join();
+        std::unique_lock lock(m_mutex);
+        m_changed.wait(lock, [this] { return !m_isRunning; });
+        forgetThread();
     }
 
-    /// Destroyed at the end of the process, after whatever was built after prepareReaper().
+    /// Destroyed at the end of the process, after whatever was built after prepareReaper(). Not in a child of
+    /// the process that has used it: a thread that is not there would still be waited for.
     static InstanceReaper& theOne() {
-        static InstanceReaper reaper;
-        return reaper;
+        struct Keeper {
+            Keeper() = default;
+            Keeper(const Keeper&) = delete;
+            Keeper& operator=(const Keeper&) = delete;
+            ~Keeper() {
+                if (reaper->isOfThisProcess()) delete reaper;
+            }
+            InstanceReaper* const reaper = new InstanceReaper;
+        };
+        static const Keeper keeper;
+        return *keeper.reaper;
     }
 
     /// The deleter of listed instances, for one that nobody holds any more. Never fails and never waits.
@@ -91,40 +102,57 @@ class InstanceReaper {
     }
 
     void add(CimInstance* instance) noexcept {
-        {
-            const std::lock_guard lock(m_mutex);
-            (m_last == nullptr ? m_first : m_last->m_nextToDestroy) = instance;
-            m_last = instance;
-            startThread();
-        }
-        m_changed.notify_all();
+        const std::lock_guard lock(m_mutex);
+        instance->m_releaseTime = os::getMonotonicuSeconds();
+        (m_last == nullptr ? m_first : m_last->m_nextToDestroy) = instance;
+        m_last = instance;
+        startThread();
     }
 
     void drain() noexcept {
+        const utils::Thread::Waiting waiting;
         std::unique_lock lock(m_mutex);
+        if (!isOfThisProcess() && m_first == nullptr) return;
         // Without a thread the caller does the work, since it must not go on before it is done.
         if (m_first != nullptr && !startThread()) destroyQueued(lock);
         m_changed.wait(lock, [this] { return m_first == nullptr && m_busy == 0; });
     }
 
   private:
+    bool isOfThisProcess() const { return m_forks == os::forkCount(); }
+
     /// Under the lock. False when the system refuses a thread.
     bool startThread() noexcept {
-        if (m_thread.joinable()) return true;
-        try {
-            m_thread = std::thread([this] { run(); });
-            return true;
-        } catch (const std::exception&) {
-            return false;
+        if (isOfThisProcess() && m_isRunning) return true;
+        forgetThread();
+        if (!isOfThisProcess()) m_busy = 0;
+        m_forks = os::forkCount();
+        const utils::SignalsBlocked blocked;
+        m_isRunning = pthread_create(&m_thread, nullptr, &InstanceReaper::run, this) == 0;
+        m_isJoinable = m_isRunning;
+        return m_isRunning;
+    }
+
+    /// Under the lock, which a thread that has ended does not take any more.
+    void forgetThread() noexcept {
+        if (!m_isJoinable) return;
+        m_isJoinable = false;
+        if (!isOfThisProcess()) return;
+        // The last thread of a process runs its end, and may be the one that destroyed.
+        if (pthread_equal(m_thread, pthread_self()) != 0) {
+            pthread_detach(m_thread);
+        } else {
+            pthread_join(m_thread, nullptr);
         }
     }
 
-    void run() noexcept {
-        std::unique_lock lock(m_mutex);
-        while (!m_ending) {
-            m_changed.wait(lock, [this] { return m_first != nullptr || m_ending; });
-            destroyQueued(lock);
-        }
+    static void* run(void* argument) noexcept {
+        auto& reaper = *static_cast<InstanceReaper*>(argument);
+        std::unique_lock lock(reaper.m_mutex);
+        reaper.destroyQueued(lock);
+        reaper.m_isRunning = false;
+        reaper.m_changed.notify_all();
+        return nullptr;
     }
 
     /// Under the lock, which it gives up while a destructor runs.
@@ -145,11 +173,13 @@ class InstanceReaper {
 
     std::mutex m_mutex;
     std::condition_variable m_changed;
-    std::thread m_thread;
+    pthread_t m_thread{};
+    bool m_isRunning = false;
+    bool m_isJoinable = false;
+    unsigned int m_forks = os::forkCount();  ///< where the thread runs
     CimInstance* m_first = nullptr;
     CimInstance* m_last = nullptr;
     std::uint32_t m_busy = 0;  ///< how many are being destroyed
-    bool m_ending = false;
 };
 
 /// A list and its instances end in any order: an instance that a request still holds outlives its list, and

@@ -3,6 +3,7 @@
 
 #include <atomic>
 #include <cstddef>
+#include <cstdint>
 #include <memory>
 #include <mutex>
 #include <string>
@@ -117,6 +118,9 @@ class QUENX_EXPORT CimInstance {
     /// For classes whose destructor waits (for a thread, say): a released instance is then destroyed on a
     /// thread of the framework's own, so that no request waits for it.
     void setDestructionWaits() { m_destructionWaits = true; }
+    /// When the framework was to destroy it (os::getMonotonicuSeconds()); 0 when somebody else does. Those
+    /// that wait for some time are destroyed one by one, and each counts its time from here.
+    std::uint64_t releaseTime() const { return m_releaseTime; }
 
   private:
     struct Shape;
@@ -141,6 +145,7 @@ class QUENX_EXPORT CimInstance {
     const CimClassInfo* m_classInfo = nullptr;
     std::weak_ptr<InstanceListLink> m_list;  ///< set once, when the instance is added
     CimInstance* m_nextToDestroy = nullptr;  ///< links the queue of instances to destroy
+    std::uint64_t m_releaseTime = 0;         ///< when it was queued; 0 for never
     bool m_destructionWaits = false;
     std::atomic<bool> m_deleted{false};
 };

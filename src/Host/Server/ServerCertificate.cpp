@@ -8,6 +8,7 @@
 #include <cstdint>
 #include <cstring>
 #include <ctime>
+#include <filesystem>
 #include <memory>
 #include <stdexcept>
 #include <system_error>
@@ -30,6 +31,11 @@ void check(int status, const std::string& file) {
 }
 
 std::string readPem(const std::string& file) {
+    std::error_code unknown;  // then reading it says why
+    // A FIFO would give what somebody else writes into it, and a device may never end.
+    if (const auto found = std::filesystem::status(file, unknown);
+        std::filesystem::exists(found) && !std::filesystem::is_regular_file(found))
+        fail(file, "it is not a regular file");
     try {
         if (const auto bytes = os::readWholeFile(file, SIZE_MAX)) return {bytes->begin(), bytes->end()};
     } catch (const std::system_error& error) {

@@ -8,6 +8,7 @@
 #include "Utils/Exception.h"
 #include "Utils/Log.h"
 #include "Utils/Os/Linux/LinuxOSLocker.h"
+#include "Utils/Os/Linux/linux.h"
 
 namespace {
 
@@ -15,6 +16,15 @@ constexpr std::uint32_t kStartPause = 10;       // ms
 constexpr std::uint32_t kTerminationPoll = 50;  // ms
 constexpr int kDestructionTimeout = 3000;       // ms
 constexpr std::uint32_t kTimeoutErrorCode = 4;
+
+/// What is left of the wait for a worker's end. Jobs that go together wait side by side.
+int remainingWait(std::uint64_t since) {
+    if (since == 0) return kDestructionTimeout;
+    const std::uint64_t waited = (os::getMonotonicuSeconds() - since) / 1000;
+    if (waited >= kDestructionTimeout) return 0;
+    // In whole steps: what ends below zero counts as a failure.
+    return kDestructionTimeout - static_cast<int>(waited / kTerminationPoll * kTerminationPoll);
+}
 
 }  // namespace
 
@@ -27,11 +37,11 @@ JobThread::JobThread(Quenx_ConcreteJob* job) : m_myJob(job) {
 
 JobThread::~JobThread() {
     QUENX_DEBUG("Destroying JobThread %p", static_cast<const void*>(this));
-    if (m_started == true) {
+    if (m_started == true && isInThisProcess()) {
         QUENX_DEBUG("Destroying JobThread %p, waiting for terminate", static_cast<const void*>(this));
         // Not terminate(): no class derived from this one is left that could have its own say.
         JobThread::stopFwUpdateExecution();
-        if (waitForEnd(kDestructionTimeout)) {
+        if (waitForEnd(remainingWait(m_myJob->releaseTime()))) {
             QUENX_DEBUG("JobThread %p, terminated", static_cast<const void*>(this));
         } else {
             QUENX_ERROR("JobThread %p, terminating timeout error", static_cast<const void*>(this));

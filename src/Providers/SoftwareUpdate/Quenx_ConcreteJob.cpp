@@ -9,6 +9,7 @@
 #include "Providers/SoftwareUpdate/ImageVerification.h"
 #include "Providers/SoftwareUpdate/JobThread.h"
 #include "Utils/Exception.h"
+#include "Utils/Os/Linux/linux.h"
 #include "Utils/Utils.h"
 
 namespace {
@@ -71,7 +72,7 @@ Quenx_ConcreteJob::Quenx_ConcreteJob(std::string adapterName, int jobId, std::st
         throw;
     }
     // What verification took. The end of the job sets it again.
-    m_elapsedTime.setInterval(m_startTime);
+    m_elapsedTime = timeSinceStart();
 }
 
 Quenx_ConcreteJob::~Quenx_ConcreteJob() {
@@ -85,6 +86,11 @@ Quenx_ConcreteJob::~Quenx_ConcreteJob() {
 
 std::string Quenx_ConcreteJob::getUniqId() const {
     return utils::formatStr("FirmwareUpdate@Job#%d", m_jobId);
+}
+
+utils::Time Quenx_ConcreteJob::timeSinceStart() const {
+    // Not the difference of two times of day, between which the clock may have been set.
+    return utils::Time(os::getMonotonicuSeconds() - m_start);
 }
 
 const std::uint8_t* Quenx_ConcreteJob::getFlashImage() const {
@@ -117,7 +123,7 @@ void Quenx_ConcreteJob::setJobState(JobStateVal state) {
     m_startClaimed = false;
     m_timeOfLastStateChange.resetTimer();
     m_adapterGivenUp = givesUpTheAdapter(state).value_or(m_adapterGivenUp);
-    if (state == JobStateCompleted) m_elapsedTime.setInterval(m_startTime);
+    if (state == JobStateCompleted) m_elapsedTime = timeSinceStart();
     if (!m_adapterGivenUp) return;
     released.swap(m_flashImage);
     m_flashImageSize = 0;

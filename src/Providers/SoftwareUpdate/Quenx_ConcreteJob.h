@@ -12,6 +12,7 @@
 #include "Providers/SoftwareUpdate/AdapterClaim.h"
 #include "Utils/FirmwareTypes.h"
 #include "Utils/Os/Linux/Mutex.h"
+#include "Utils/Os/Linux/linux.h"
 #include "Utils/Time.h"
 
 class JobThread;
@@ -51,6 +52,8 @@ class Quenx_ConcreteJob : public CIM_ConcreteJob {
     /// do.
     virtual bool threadControl(ThreadOperationCommand command, int timeout);
 
+    using core::CimInstance::releaseTime;
+
     std::string getUniqId() const;
     std::string getAdapterName() const { return m_adapterName; }
     std::vector<utils::FirmwareType> getImageTypes() const { return m_imageTypes; }
@@ -86,6 +89,7 @@ class Quenx_ConcreteJob : public CIM_ConcreteJob {
   private:
     /// True for the one caller who may start the job.
     bool claimStart();
+    utils::Time timeSinceStart() const;
 
     const std::string m_adapterName;
     const int m_jobId;
@@ -104,5 +108,6 @@ class Quenx_ConcreteJob : public CIM_ConcreteJob {
     std::uint32_t m_lastErrorCode QUENX_GUARDED_BY(m_stateMutex) = 0;
     std::string m_lastErrorText QUENX_GUARDED_BY(m_stateMutex);
     std::uint32_t m_percentComplete QUENX_GUARDED_BY(m_stateMutex) = 0;
+    const std::uint64_t m_start = os::getMonotonicuSeconds();  ///< measures what m_startTime tells
     mutable utils::Mutex m_stateMutex;  ///< what the worker writes and requests read; held for moments only
 };

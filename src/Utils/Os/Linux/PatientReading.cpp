@@ -9,11 +9,11 @@
 #include <algorithm>
 #include <cerrno>
 #include <condition_variable>
-#include <csignal>
 #include <filesystem>
 #include <mutex>
 #include <utility>
 
+#include "Utils/Os/Linux/SignalsBlocked.h"
 #include "Utils/Os/Linux/linux.h"
 
 namespace os {
@@ -122,19 +122,6 @@ void* readerThread(void* argument) {
     return nullptr;
 }
 
-/// 0, or the errno value. The thread gets no signals, which belong to those of the hosting program.
-int startThread(pthread_t& thread, Reading& reading) {
-    sigset_t signals;
-    ::sigfillset(&signals);
-    for (const int fault : {SIGSEGV, SIGBUS, SIGFPE, SIGILL, SIGTRAP, SIGABRT, SIGSYS, SIGPROF})
-        ::sigdelset(&signals, fault);
-    sigset_t before;
-    ::pthread_sigmask(SIG_BLOCK, &signals, &before);
-    const int error = ::pthread_create(&thread, nullptr, &readerThread, &reading);
-    ::pthread_sigmask(SIG_SETMASK, &before, nullptr);
-    return error;
-}
-
 /// Waits until `isEnough` says so, or for too long; false then. A silence ends whenever `steps` moves.
 template <typename Condition, typename Steps>
 bool waitFor(std::unique_lock<std::mutex>& lock, Patience& patience, Condition isEnough, Steps steps) {
@@ -168,7 +155,8 @@ bool carryOutPatiently(std::unique_ptr<Reading>& reading, Patience& patience) {
     patience.isOver = !isFree || other() != nullptr || readings.leftBehind >= kMaxLeftBehind;
     if (patience.isOver) return false;
     pthread_t thread{};
-    if (startThread(thread, *reading) != 0) {
+    if (const utils::SignalsBlocked blocked;
+        ::pthread_create(&thread, nullptr, &readerThread, reading.get()) != 0) {
         // A process that gets no threads can still update its adapters.
         lock.unlock();
         carryOut(*reading);

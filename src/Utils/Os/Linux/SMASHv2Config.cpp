@@ -109,6 +109,8 @@ void SMASHv2Config::initialize() {
         // Built apart and put in place at the end: a pass that fails leaves the old list whole.
         StringArray directories;
         std::ifstream file(m_path);
+        // A stream keeps exceptions to itself unless asked, and the rest of the file would go missing unsaid.
+        file.exceptions(std::ios::badbit);
         for (std::string line; std::getline(file, line);) {
             if (!isSkipped(line)) readLine(std::move(line), directories);
         }
@@ -122,6 +124,7 @@ void SMASHv2Config::readLine(std::string line, StringArray& directories) {
     // Everywhere, values included: so "Key=value" and "Key = value" read alike.
     replaceCharacter(line, '=', ' ');
     std::istringstream words(line);
+    words.exceptions(std::ios::badbit);
     // A host may have set a locale in which "1.000" is a number.
     words.imbue(std::locale::classic());
     std::string key;

@@ -2,7 +2,6 @@
 #include "Utils/Os/Linux/Thread.h"
 
 #include <cxxabi.h>
-#include <signal.h>
 
 #include <cerrno>
 #include <ctime>
@@ -10,6 +9,8 @@
 
 #include "Utils/Exception.h"
 #include "Utils/Log.h"
+#include "Utils/Os/Linux/SignalsBlocked.h"
+#include "Utils/Os/Linux/linux.h"
 #include "Utils/Utils.h"
 
 namespace utils {
@@ -33,26 +34,7 @@ class InExecute {
     IntThreadData& m_data;
 };
 
-/// Keeps signals from a thread that is started meanwhile, which inherits the mask. They belong to the threads
-/// of the hosting program: a worker that waits in the kernel would answer them late, or interrupt a write to
-/// a flash.
-class SignalsBlocked {
-  public:
-    SignalsBlocked() {
-        sigset_t signals;
-        sigfillset(&signals);
-        // What a thread's own mistakes raise stays, or nobody would learn where the mistake is.
-        for (const int fault : {SIGSEGV, SIGBUS, SIGFPE, SIGILL, SIGTRAP, SIGABRT, SIGSYS, SIGPROF})
-            sigdelset(&signals, fault);
-        pthread_sigmask(SIG_BLOCK, &signals, &m_before);
-    }
-    ~SignalsBlocked() { pthread_sigmask(SIG_SETMASK, &m_before, nullptr); }
-    SignalsBlocked(const SignalsBlocked&) = delete;
-    SignalsBlocked& operator=(const SignalsBlocked&) = delete;
-
-  private:
-    sigset_t m_before{};
-};
+std::atomic<pthread_t> waitingThread{};
 
 void runBody(Thread& thread) {
     const void* const address = &thread;
@@ -77,6 +59,7 @@ Thread::~Thread() {
 
 void Thread::start() {
     const SignalsBlocked blocked;
+    m_data->forks = os::forkCount();
     const int error =
         m_data->started ? EALREADY : pthread_create(&m_data->handle, nullptr, &thread_entry, this);
     if (error != 0) {
@@ -107,6 +90,11 @@ void Thread::shutdown() noexcept {
     const void* const address = this;
     formatDebugLog(__FILE__, kEndFunction, __LINE__, "Thread::~Thread(%p)", address);
     m_data->stopRequested = true;
+    // A child of the process that started the thread does not have it, and nothing to wait for.
+    if (!isInThisProcess()) {
+        m_data.reset();
+        return;
+    }
     // The delays give a body time to see the flag, and the log time to tell why a shutdown takes long.
     for (int i = 0; i < kJoinDelays && m_data->inExecute; ++i) {
         formatDebugLog(__FILE__, kEndFunction, __LINE__,
@@ -117,9 +105,23 @@ void Thread::shutdown() noexcept {
     m_data.reset();
 }
 
+bool Thread::isInThisProcess() const noexcept {
+    return m_data != nullptr && (m_data->started == false || m_data->forks == os::forkCount());
+}
+
+Thread::Waiting::Waiting() noexcept {
+    waitingThread = pthread_self();
+}
+
+Thread::Waiting::~Waiting() {
+    waitingThread = pthread_t{};
+}
+
 void Thread::join() noexcept {
-    // A thread that destroys its own object cannot be joined by anyone.
-    const bool isOwn = pthread_equal(m_data->handle, pthread_self()) != 0;
+    // A thread that destroys its own object cannot be joined by anyone, nor one that waits for this to be
+    // done. Then it has left its body, and runs the end of the process.
+    const bool isOwn = pthread_equal(m_data->handle, pthread_self()) != 0 ||
+                       pthread_equal(m_data->handle, waitingThread.load()) != 0;
     const int status = isOwn ? EDEADLK : pthread_join(m_data->handle, nullptr);
     if (status != 0) {
         formatDebugLog(__FILE__, kEndFunction, __LINE__, "Thread %p: join status is %d",

@@ -16,6 +16,7 @@ struct IntThreadData {
     Atomic<bool> inExecute;      ///< true while execute() runs
     Atomic<bool> stopRequested;  ///< true once the thread shall end
     Atomic<bool> started;        ///< true once there is a thread to join
+    unsigned int forks = 0;      ///< os::forkCount() where it was started
 };
 
 /// The base of a thread. The derived class supplies execute(), which polls isStopRequested() if it can end
@@ -37,7 +38,20 @@ class QUENX_EXPORT Thread {
     /// Sleeps for so many milliseconds, signals or not.
     static void msleep(unsigned int milliseconds);
 
+    /// Says for a scope that the calling thread waits until other threads have destroyed some objects. At the
+    /// end of a process that thread may itself be one whose object is destroyed: then nobody joins it.
+    class QUENX_EXPORT Waiting {
+      public:
+        Waiting() noexcept;
+        ~Waiting();
+        Waiting(const Waiting&) = delete;
+        Waiting& operator=(const Waiting&) = delete;
+    };
+
   protected:
+    /// False in a child of the process that started the thread: a fork takes the calling thread alone.
+    bool isInThisProcess() const noexcept;
+
     /// Sets the stop flag. A thread whose flag is set before it begins never calls execute().
     void requestStop() noexcept;
     bool isStopRequested() const noexcept;

@@ -4,12 +4,15 @@
 #include <dirent.h>
 #include <fcntl.h>
 #include <limits.h>
+#include <pthread.h>
 #include <sys/stat.h>
 #include <sys/time.h>
 #include <unistd.h>
 
 #include <algorithm>
+#include <atomic>
 #include <cerrno>
+#include <chrono>
 #include <cstdlib>
 #include <memory>
 #include <string_view>
@@ -23,6 +26,9 @@
 namespace os {
 
 namespace {
+
+std::atomic<unsigned int> forks{0};
+[[maybe_unused]] const int forkHandler = pthread_atfork(nullptr, nullptr, [] { ++forks; });
 
 struct CloseDirectory {
     void operator()(DIR* directory) const noexcept { closedir(directory); }
@@ -62,10 +68,26 @@ std::uint64_t getuSecondsSinceEpoch() noexcept {
     return static_cast<std::uint64_t>(now.tv_sec) * 1000000 + static_cast<std::uint64_t>(now.tv_usec);
 }
 
+std::uint64_t getMonotonicuSeconds() noexcept {
+    const auto now = std::chrono::steady_clock::now().time_since_epoch();
+    return static_cast<std::uint64_t>(std::chrono::duration_cast<std::chrono::microseconds>(now).count());
+}
+
+unsigned int forkCount() noexcept {
+    return forks.load(std::memory_order_relaxed);
+}
+
 std::string getHostname() {
     char name[HOST_NAME_MAX + 1] = {};
     if (gethostname(name, sizeof name - 1) != 0 || name[0] == '\0') return "localhost";
     return name;
+}
+
+void openStandardDescriptors() noexcept {
+    int number = 0;
+    while (number >= 0 && number <= STDERR_FILENO)
+        number = open("/dev/null", O_RDWR);
+    if (number > STDERR_FILENO) close(number);
 }
 
 std::int32_t getFileSize(const std::string& path) {

@@ -24,8 +24,19 @@ QUENX_EXPORT const char* getEnvVariable(const char* name) noexcept;
 /// The wall clock, microseconds since the Unix epoch.
 QUENX_EXPORT std::uint64_t getuSecondsSinceEpoch() noexcept;
 
+/// Microseconds on a clock that nobody sets; only differences mean something.
+QUENX_EXPORT std::uint64_t getMonotonicuSeconds() noexcept;
+
+/// How many forks are between the process that loaded this library and this one. A thread that was started
+/// at another number is not here.
+QUENX_EXPORT unsigned int forkCount() noexcept;
+
 /// The host's name, "localhost" when it cannot be had.
 QUENX_EXPORT std::string getHostname();
+
+/// Opens /dev/null where standard input, output or error is closed, so that no other file gets their numbers
+/// and what is written to them. For the first line of main().
+QUENX_EXPORT void openStandardDescriptors() noexcept;
 
 /// The size in bytes of a regular file.
 /// @throws utils::Exception "Could not open the file %s" for what does not exist, cannot be opened, has a NUL

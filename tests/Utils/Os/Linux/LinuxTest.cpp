@@ -69,6 +69,18 @@ TEST(FileSizeTest, FailsForUnreadableFilesAndDescriptorZero) {
         testing::ExitedWithCode(0), "");
 }
 
+TEST(LinuxTest, KeepsTheNumbersOfClosedStandardStreams) {
+    EXPECT_EXIT(
+        {
+            for (int number = 0; number <= 2; ++number)
+                close(number);
+            os::openStandardDescriptors();
+            const int next = dup(0);
+            _exit(next > 2 && write(1, "x", 1) == 1 && write(2, "x", 1) == 1 ? 0 : 1);
+        },
+        testing::ExitedWithCode(0), "");
+}
+
 TEST(LinuxTest, ReadsWholeFilesUpToALimit) {
     const test::TempFolder folder;
     const std::string large(600 * 1024, 'x');
