@@ -166,6 +166,34 @@ void writeDebugLog(const char* file, const char* function, int line, std::string
     }
 }
 
+void writeAuditLog(const std::string& line) noexcept {
+    const ErrnoKeeper callersErrno;
+    if (isErrorLogged()) syslog(LOG_NOTICE, "%s", line.c_str());
+}
+
+std::string escapeForLog(std::string_view text, std::size_t limit) {
+    std::string escaped;
+    for (const char c : text) {
+        std::string piece(1, c);
+        // Whatever is not ASCII too: a look-alike of another name, or an override that turns the line around.
+        if (isControl(c) || static_cast<unsigned char>(c) >= 0x80) {
+            piece = "\\x" + hexByte(static_cast<unsigned char>(c));
+        } else if (c == '"' || c == '\'' || c == '\\') {
+            piece.insert(0, 1, '\\');
+        }
+        if (escaped.size() + piece.size() > limit) return escaped + "\\...";
+        escaped += piece;
+    }
+    return escaped;
+}
+
+std::string escapeForFormat(std::string_view text) {
+    std::string format;
+    for (const char c : escapeForLog(text))
+        format.append(c == '%' ? 2 : 1, c);
+    return format;
+}
+
 __attribute__((noinline)) void logBacktrace(int priority, int depth, bool withSymbols) noexcept {
     const ErrnoKeeper callersErrno;
     if (depth <= 0) return;

@@ -2,14 +2,17 @@
 #pragma once
 
 #include <atomic>
+#include <cstddef>
 #include <cstdint>
 #include <string>
+#include <string_view>
 
 #include "Utils/Export.h"
 
-/// The way into the system log. Every line reads `[level] "message" (function@file:line)`. Any thread may log
-/// at any time, static initialisation and destruction included. No function here reports a failure or lets an
-/// exception out, formatLogMessage excepted: a line that cannot be built is dropped. errno is left as it was.
+/// The way into the system log. Every line but an audit line reads `[level] "message" (function@file:line)`.
+/// Any thread may log at any time, static initialisation and destruction included. No function here reports a
+/// failure or lets an exception out, formatLogMessage excepted: a line that cannot be built is dropped. errno
+/// is left as it was.
 namespace utils {
 
 /// -1: not yet opened; 0: nothing is written; 1: errors; 2: errors with symbolised backtraces, and debug
@@ -28,6 +31,19 @@ QUENX_EXPORT void writeErrorLog(const char* file, const char* function, int line
 /// Writes one debug line when the level is 2 or more. The message is a text, not a format.
 QUENX_EXPORT void writeDebugLog(const char* file, const char* function, int line,
                                 std::string message) noexcept;
+
+/// Writes one finished line when the level is 1 or more, as it is: nothing in it is expanded, and no
+/// backtrace follows. What comes from outside has to be escaped already.
+QUENX_EXPORT void writeAuditLog(const std::string& line) noexcept;
+
+/// A text from outside as it may stand in a log, bare or between quotes: printable ASCII, with a backslash
+/// before quotes, single ones too, and backslashes; any other byte as `\xNN`. At most `limit` characters, and
+/// then the mark `\...`, which no text can hold, if something is missing.
+/// @throws std::bad_alloc
+QUENX_EXPORT std::string escapeForLog(std::string_view text, std::size_t limit = 256);
+/// The same for a line in which `%m` would be expanded: each `%` is doubled.
+/// @throws std::bad_alloc
+QUENX_EXPORT std::string escapeForFormat(std::string_view text);
 
 /// The finished line, at most 511 characters, with the base name of `file`.
 /// @throws std::bad_alloc

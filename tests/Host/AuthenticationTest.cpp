@@ -15,6 +15,7 @@
 #include <thread>
 
 #include "Host/Authentication/ClientAddress.h"
+#include "Support/SyslogCapture.h"
 #include "Support/TempFolder.h"
 
 namespace {
@@ -200,6 +201,25 @@ TEST_F(AuthenticationTest, AsksOnceForRightCredentials) {
     for (int i = 0; i < 2; ++i)
         EXPECT_EQ(forgetful.authenticate(m_right, "").outcome, AuthenticationOutcome::Accepted);
     EXPECT_EQ(m_asked, 5);
+}
+
+TEST_F(AuthenticationTest, LeavesOneAuditLineForEachRefusal) {
+    start(0ms, 0ms);
+    const test::LogLevelGuard level(1);
+    const test::SyslogCapture log;
+    EXPECT_EQ(outcome(m_right), AuthenticationOutcome::Accepted);
+    outcome("Basic Og==");  // nobody's name
+    EXPECT_EQ(outcome(m_wrong), AuthenticationOutcome::Wrong);
+    EXPECT_EQ(outcome(m_stranger), AuthenticationOutcome::Forbidden);
+    const auto lines = log.lines();
+    ASSERT_EQ(lines.size(), 3U);  // and no backtrace
+    const auto line = [](const std::string& user, const std::string& why) {
+        return "[audit] user=\"" + user + "\" address=\"192.0.2.1\" operation=\"login\" target=\"\" " +
+               "arguments=\"\" outcome=\"denied: " + why + "\"";
+    };
+    EXPECT_EQ(lines[0].text, line("", "wrong user or password"));
+    EXPECT_EQ(lines[1].text, line("admin\\xc3\\xbc", "wrong user or password"));
+    EXPECT_EQ(lines[2].text, line("stranger", "not admitted"));
 }
 
 TEST_F(AuthenticationTest, LetsACrowdThatGuessesKeepNobodyOut) {

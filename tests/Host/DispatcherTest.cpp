@@ -6,6 +6,7 @@
 #include "CimXml/Response.h"
 #include "CimXml/WireCheck.h"
 #include "Framework/Requests/CimRequests.h"
+#include "Support/SyslogCapture.h"
 #include "Support/TestModel.h"
 
 namespace {
@@ -90,7 +91,7 @@ class DispatcherTest : public ::testing::Test {
     }
 
     std::string m_namespace = "root/cimv2";
-    host::Caller m_caller{"admin", true, "localhost"};
+    host::Caller m_caller{"admin", true, "localhost", "192.0.2.1"};
     test::GadgetAgent m_agent;
     test::Gadget& m_a = *m_agent.add("a", 1);
     test::Gadget& m_b = *m_agent.add("b", 2);
@@ -341,6 +342,37 @@ TEST_F(DispatcherTest, PullsToTheEnd) {
     const auto paths =
         call("OpenReferenceInstancePaths", {{"InstanceName", gadget("b", "2")}, {"MaxObjectCount", "5"}});
     EXPECT_EQ(paths.paths.size(), 1U);
+}
+
+TEST_F(DispatcherTest, LeavesOneAuditLineForEachChangeAndRefusal) {
+    const test::LogLevelGuard level(1);
+    test::SyslogCapture::clear();
+    const CimPath a = gadget("a", "1");
+    invoke(a, "Work", {argument("Text", "x' Numbers='9"), arrayOf("Numbers", {"5", "7"})});
+    send("GetInstance", {{"InstanceName", a}});
+    send("NoSuchOperation", {});
+    send("deleteinstance", {{"InstanceName", a}});
+    // Whatever a name or a text holds, it can pose as nothing else, and no line is long.
+    m_caller = {"x\" outcome=\"done\"\n%m%s\\\xE2\x80\xAE", false, "localhost", "192.0.2.1"};
+    invoke(a, "Work", {});
+    m_caller.user = std::string(5000, 'u');
+    const std::string text(2000, 't');
+    invoke(a, text, std::vector(50, arrayOf(text, std::vector<core::CimScalar>(50, text))));
+
+    const auto lines = test::SyslogCapture::lines();
+    ASSERT_EQ(lines.size(), 4U);
+    const std::string who = R"([audit] user="admin" address="192.0.2.1" operation=)";
+    const std::string target = R"( target="root/cimv2:test_gadget.number=\"1\",id=\"a\"" )";
+    const std::string name = R"(x\" outcome=\"done\"\x0a%m%s\\\xe2\x80\xae)";
+    EXPECT_EQ(lines[0].text, who + R"("Work")" + target +
+                                 R"(arguments="Text='x\' Numbers=\'9' Numbers='5,7'" )" +
+                                 R"(outcome="returned 12, Job=root/cimv2:Test_Gadget.ID=\"a\",Number=1")");
+    EXPECT_EQ(lines[1].text, who + R"("deleteinstance")" + target + R"(arguments="" outcome="done")");
+    EXPECT_EQ(lines[2].text, "[audit] user=\"" + name + R"(" address="192.0.2.1" operation="Work")" + target +
+                                 R"(arguments="" outcome="denied: user )" + name + " may only read\"");
+    EXPECT_LT(lines[3].text.size(), 1300U);
+    EXPECT_NE(lines[3].text.find(std::string(64, 'u') + R"(\..." address="192.0.2.1")"), std::string::npos);
+    EXPECT_TRUE(lines[3].text.ends_with(R"(uu\...")")) << lines[3].text;
 }
 
 }  // namespace

@@ -50,6 +50,19 @@ TEST_F(InstallTest, WritesTheImageAndSaysWhatChanged) {
         << forced.out;
 }
 
+TEST_F(InstallTest, LeavesAnAuditLine) {
+    const std::string file = "'file://" + m_image + "'";
+    for (const auto& [verb, operation, returned] :
+         {std::tuple("check", "CheckImage", "0"), std::tuple("install", "InstallFromURI", "4096, Job=")}) {
+        const std::string error =
+            quenxctl(std::string(verb) + " --target eth0 IMAGE --force", {"QUENX_LOG=stderr"}).error;
+        for (const std::string& part :
+             {std::string("[audit] user=\""), std::string("\" address=\"local\" operation=\"") + operation,
+              "arguments=\"URI=" + file, std::string("outcome=\"returned ") + returned})
+            EXPECT_TRUE(contains(error, part)) << part << error;
+    }
+}
+
 TEST_F(InstallTest, ShowsABarOnATerminalOnly) {
     const struct {
         Program::Output output;

@@ -1,9 +1,13 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Cli/Update/Service.h"
 
+#include <pwd.h>
+#include <unistd.h>
+
 #include "Framework/Classes/CimBroker.h"
 #include "Framework/Classes/RequestScope.h"
 #include "Framework/Model/CimInstance.h"
+#include "Framework/Requests/Audit.h"
 #include "Providers/Schema/ProviderInterfaces.h"
 #include "Providers/Schema/ValueMaps.h"
 
@@ -43,9 +47,43 @@ core::Argument reference(const std::string& name, const core::CimPath& path) {
     return {name, core::CimValue::of(core::CimType::Reference, path)};
 }
 
+core::Argument imageOf(const Candidate& candidate) {
+    if (candidate.identity.isValid()) return reference("Source", candidate.identity);
+    return {"URI", core::CimValue::of(core::CimType::String, candidate.uri)};
+}
+
+std::string localUser() {
+    const uid_t id = ::getuid();
+    const passwd* entry = ::getpwuid(id);
+    return entry == nullptr ? std::to_string(id) : entry->pw_name;
+}
+
+/// A call of the service, as the methods take it.
+struct ServiceCall {
+    core::CimPath service;
+    std::string method;
+    std::vector<core::Argument> arguments;
+
+    /// In this process nobody else knows who asks, so the audit line is written here. A server writes its
+    /// own.
+    void audit(const Connection& connection, const std::string& outcome) const {
+        if (connection.isInProcess)
+            core::audit({localUser(), "local", method, service.toString(), outcome}, arguments);
+    }
+
+    core::MethodResult run(const Connection& connection) const try {
+        const core::MethodResult result = connection.operations->invokeMethod(service, method, arguments);
+        audit(connection, core::outcomeOf(result));
+        return result;
+    } catch (const core::CimError& error) {
+        audit(connection, core::outcomeOf(error.status(), error.what()));
+        throw;
+    }
+};
+
 }  // namespace
 
-core::MethodResult startUpdate(core::CimOperations& operations, const Candidate& candidate) {
+core::MethodResult startUpdate(const Connection& connection, const Candidate& candidate) {
     using core::CimType;
     using core::CimValue;
     const InstallCodes options(candidate);
@@ -56,16 +94,13 @@ core::MethodResult startUpdate(core::CimOperations& operations, const Candidate&
         options.values.empty()
             ? CimValue::null(CimType::String, true)
             : CimValue::arrayOf(CimType::String, {options.values.begin(), options.values.end()});
-    const bool hasIdentity = candidate.identity.isValid();
-    const core::Argument image = hasIdentity
-                                     ? reference("Source", candidate.identity)
-                                     : core::Argument{"URI", CimValue::of(CimType::String, candidate.uri)};
-    return operations.invokeMethod(findService(operations),
-                                   hasIdentity ? "InstallFromSoftwareIdentity" : "InstallFromURI",
-                                   {image,
-                                    reference("Target", candidate.adapter.path),
-                                    {"InstallOptions", CimValue::arrayOf(CimType::Uint16, codes)},
-                                    {"InstallOptionsValues", values}});
+    const ServiceCall call{findService(*connection.operations),
+                           candidate.identity.isValid() ? "InstallFromSoftwareIdentity" : "InstallFromURI",
+                           {imageOf(candidate),
+                            reference("Target", candidate.adapter.path),
+                            {"InstallOptions", CimValue::arrayOf(CimType::Uint16, codes)},
+                            {"InstallOptionsValues", values}}};
+    return call.run(connection);
 }
 
 core::CimPath jobOf(const core::MethodResult& result) {
@@ -78,21 +113,21 @@ core::CimPath jobOf(const core::MethodResult& result) {
 }
 
 std::optional<std::uint32_t> verifyOnly(const Connection& connection, const Candidate& candidate) {
-    core::CimPath service = findService(*connection.operations);
-    if (candidate.identity.isValid()) {
-        return connection.operations
-            ->invokeMethod(
-                service, "CheckSoftwareIdentity",
-                {reference("Source", candidate.identity), reference("Target", candidate.adapter.path)})
-            .returnValue;
-    }
+    ServiceCall call{findService(*connection.operations),
+                     "CheckSoftwareIdentity",
+                     {imageOf(candidate), reference("Target", candidate.adapter.path)}};
+    if (candidate.identity.isValid()) return call.run(connection).returnValue;
     if (!connection.isInProcess) return std::nullopt;
     // No method of the model does this; the service's own interface in this process does.
     const core::RequestScope scope;
-    auto* check = dynamic_cast<update::ImageCheck*>(core::GetCimBroker()->getInstanceByPath(service));
+    auto* check = dynamic_cast<update::ImageCheck*>(core::GetCimBroker()->getInstanceByPath(call.service));
     if (check == nullptr) return std::nullopt;
     const InstallCodes options(candidate);
-    return check->checkImage(candidate.uri, candidate.adapter.path, options.codes, options.values);
+    const unsigned int returned =
+        check->checkImage(candidate.uri, candidate.adapter.path, options.codes, options.values);
+    call.method = "CheckImage";
+    call.audit(connection, core::outcomeOf(core::MethodResult{returned, {}}));
+    return returned;
 }
 
 }  // namespace cli

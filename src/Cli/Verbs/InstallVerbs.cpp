@@ -162,7 +162,7 @@ void followUpdate(Context& context, const core::CimPath& job, const Candidate& c
 /// Nothing where the service was called and did not answer; the outcome then says so.
 std::optional<core::MethodResult> start(Context& context, const Candidate& candidate, Outcome& outcome) {
     try {
-        return startUpdate(*context.connection.operations, candidate);
+        return startUpdate(context.connection, candidate);
     } catch (const NoAnswer& error) {
         endAsUnknown(
             outcome,

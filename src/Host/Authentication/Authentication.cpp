@@ -7,6 +7,7 @@
 #include <mutex>
 
 #include "Framework/Model/CimType.h"
+#include "Framework/Requests/Audit.h"
 #include "Host/Authentication/ClientAddress.h"
 #include "Utils/Log.h"
 
@@ -71,12 +72,13 @@ AuthenticationResult Authentication::authenticate(const std::optional<std::strin
         QUENX_ERROR("cannot check a password: %s", error.what());
     }
     if (!checked) return {AuthenticationOutcome::Busy, {}};
-    if (!checked->user) {
-        waitUntil(checked->mayBeTold, ended);
-        return {AuthenticationOutcome::Wrong, {}};
-    }
-    return {checked->user->mayRead ? AuthenticationOutcome::Accepted : AuthenticationOutcome::Forbidden,
-            *checked->user};
+    const auto& user = checked->user;
+    if (user && user->mayRead) return {AuthenticationOutcome::Accepted, *user};
+    core::audit({credentials->user, address, "login", "",
+                 user ? "denied: not admitted" : "denied: wrong user or password"});
+    if (user) return {AuthenticationOutcome::Forbidden, *user};
+    waitUntil(checked->mayBeTold, ended);
+    return {AuthenticationOutcome::Wrong, {}};
 }
 
 std::optional<Authentication::Checked> Authentication::check(const Credentials& credentials,
@@ -101,7 +103,6 @@ std::optional<Authentication::Checked> Authentication::check(const Credentials& 
     } else {
         m_cache.forget(credentials, place);
         turn.failed();
-        QUENX_ERROR("wrong user or password \"%s\" from %s", credentials.user.c_str(), address.c_str());
     }
     return Checked{user, mayBeTold};
 }

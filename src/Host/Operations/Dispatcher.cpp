@@ -3,6 +3,8 @@
 
 #include <new>
 
+#include "Framework/Requests/Audit.h"
+
 namespace host {
 
 namespace {
@@ -16,6 +18,48 @@ void requirePrivilege(Privilege privilege, const Caller& caller) {
     if (privilege == Privilege::Administer && !caller.isAdministrator) {
         throw CimError(CimStatus::AccessDenied, "user " + caller.user + " may only read");
     }
+}
+
+/// Whether the call changes something, or would. No method is known to change nothing: a check claims its
+/// adapter.
+bool isAudited(const cimxml::Request& request) {
+    const auto* call = std::get_if<cimxml::IntrinsicCall>(&request.call);
+    if (call == nullptr) return true;
+    const Operation* operation = findOperation(call->operation);
+    return operation != nullptr && operation->privilege == Privilege::Administer;
+}
+
+struct OutcomeText {
+    std::string operator()(const ErrorResult& error) const {
+        return core::outcomeOf(error.status, error.description);
+    }
+    std::string operator()(const core::MethodResult& result) const { return core::outcomeOf(result); }
+    std::string operator()(const IntrinsicResult&) const { return "done"; }
+};
+
+/// The path that the call names; empty when it names none.
+std::string targetOf(const cimxml::IntrinsicCall& call) {
+    for (const cimxml::Parameter& parameter : call.parameters) {
+        if (const auto* path = std::get_if<core::CimPath>(&parameter.value)) return path->toString();
+        if (const auto* body = std::get_if<cimxml::InstanceBody>(&parameter.value))
+            return body->path ? body->path->toString() : body->className;
+    }
+    return "";
+}
+
+void auditRequest(const cimxml::Request& request, const Caller& caller,
+                  const cimxml::Response& response) try {
+    core::AuditEvent event{caller.user, caller.address, request.name(), "",
+                           std::visit(OutcomeText{}, response.content)};
+    if (const auto* method = std::get_if<cimxml::MethodCall>(&request.call)) {
+        event.target = method->object.toString();
+        core::audit(event, method->arguments);
+    } else {
+        event.target = targetOf(std::get<cimxml::IntrinsicCall>(request.call));
+        core::audit(event);
+    }
+} catch (const std::bad_alloc&) {
+    // As in the rest of the log: a line that cannot be built is dropped.
 }
 
 }  // namespace
@@ -53,6 +97,13 @@ core::MethodResult Dispatcher::callMethod(const cimxml::MethodCall& call, const 
 }
 
 cimxml::Response Dispatcher::dispatch(const cimxml::Request& request, const Caller& caller) {
+    cimxml::Response response = carryOut(request, caller);
+    // However it ended: that somebody was refused is worth knowing, too.
+    if (isAudited(request)) auditRequest(request, caller, response);
+    return response;
+}
+
+cimxml::Response Dispatcher::carryOut(const cimxml::Request& request, const Caller& caller) {
     cimxml::Response response;
     response.messageId = request.messageId;
     response.name = request.name();

@@ -18,13 +18,15 @@ class Dispatcher {
 
     explicit Dispatcher(Namespaces namespaces, const PullLimits& limits = {});
 
-    /// Never throws for what a request asks or a provider does, memory exhaustion included.
+    /// Never throws for what a request asks or a provider does, memory exhaustion included. Leaves an audit
+    /// line for each call that changes something, or would if it were allowed.
     cimxml::Response dispatch(const cimxml::Request& request, const Caller& caller);
 
     /// From now on every request is answered with "server is shutting down".
     void shutDown() { m_shuttingDown.store(true); }
 
   private:
+    cimxml::Response carryOut(const cimxml::Request& request, const Caller& caller);
     cimxml::IntrinsicResult callOperation(const cimxml::IntrinsicCall& call, const Caller& caller);
     core::MethodResult callMethod(const cimxml::MethodCall& call, const Caller& caller);
     core::CimOperations& findNamespace(const std::string& name) const;

@@ -20,7 +20,8 @@ enum class Privilege { Read, Administer };
 struct Caller {
     std::string user;
     bool isAdministrator = false;
-    std::string host;  ///< as the client addressed the server: host or host:port; goes into paths
+    std::string host;     ///< as the client addressed the server: host or host:port; goes into paths
+    std::string address;  ///< where the client is
 };
 
 /// What a handler works on.

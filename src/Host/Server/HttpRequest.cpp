@@ -153,17 +153,19 @@ HttpAnswer HttpRequest::carryOut() {
     try {
         const cimxml::Request request = cimxml::readRequest(m_body);
         cimxml::checkHeadersAgainst(m_head.cim, request);
-        QUENX_DEBUG("%s of %s from %s", request.name().c_str(), m_user.name.c_str(), m_head.address.c_str());
+        QUENX_DEBUG("%s of %s from %s", utils::escapeForFormat(request.name()).c_str(),
+                    utils::escapeForFormat(m_user.name).c_str(), m_head.address.c_str());
         // Paths in the answer carry the name by which the client reached us, since it may come back with
         // them.
         const Caller caller{m_user.name, m_user.isAdministrator,
-                            m_head.host.empty() ? "localhost" : m_head.host};
+                            m_head.host.empty() ? "localhost" : m_head.host, m_head.address};
         const cimxml::Response response = m_server.m_dispatcher.dispatch(request, caller);
         return {200,
                 {{"Content-Type", "application/xml; charset=\"utf-8\""}, {"CIMOperation", "MethodResponse"}},
                 cimxml::writeResponse(response)};
     } catch (const cimxml::WireError& error) {
-        QUENX_DEBUG("refused a request from %s: %s", m_head.address.c_str(), error.what());
+        QUENX_DEBUG("refused a request from %s: %s", m_head.address.c_str(),
+                    utils::escapeForFormat(error.what()).c_str());
         return HttpAnswer::refusal(error);
     }
 }

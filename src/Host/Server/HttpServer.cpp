@@ -53,7 +53,7 @@ void logLibrary(void*, const char* format, va_list arguments) __attribute__((for
 void logLibrary(void*, const char* format, va_list arguments) {
     char line[512];
     std::vsnprintf(line, sizeof line, format, arguments);
-    QUENX_DEBUG("http: %s", line);
+    QUENX_DEBUG("http: %s", utils::escapeForFormat(line).c_str());
 }
 
 }  // namespace
@@ -76,7 +76,7 @@ struct HttpServer::Callbacks {
             return MHD_YES;
         } catch (const std::exception& error) {
             // Most likely there is no memory, so none is asked for in order to answer: the connection ends.
-            QUENX_ERROR("a request failed: %s", error.what());
+            QUENX_ERROR("a request failed: %s", utils::escapeForFormat(error.what()).c_str());
             return MHD_NO;
         }
     }

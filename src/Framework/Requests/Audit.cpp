@@ -1,0 +1,78 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "Framework/Requests/Audit.h"
+
+#include "Utils/Log.h"
+
+namespace core {
+
+namespace {
+
+// What a line needs at most: syslog daemons cut longer ones, and the outcome stands at the end.
+constexpr std::size_t kNameLimit = 64;
+constexpr std::size_t kTextLimit = 256;
+constexpr std::size_t kArgumentsLimit = 400;
+
+/// " name="value"", with the value cut.
+std::string field(const char* name, const std::string& value, std::size_t limit) {
+    return std::string(" ") + name + "=\"" + utils::escapeForLog(value, limit) + '"';
+}
+
+/// "5,3"; nothing for null.
+std::string valueText(const CimValue& value) {
+    if (const CimScalar* scalar = value.scalar()) return scalarText(*scalar);
+    std::string text;
+    if (const auto* elements = value.elements()) {
+        for (const CimScalar& element : *elements) {
+            if (!text.empty()) text += ',';
+            text += scalarText(element);
+            // A client may send a megabyte of them.
+            if (text.size() > kTextLimit) break;
+        }
+    }
+    return text;
+}
+
+/// "URI='file:///new.rom' InstallOptions='5'": a quote inside is escaped, so that no value can pose as two.
+std::string argumentsText(const std::vector<Argument>& arguments) {
+    std::string text;
+    for (const Argument& argument : arguments) {
+        if (argument.value.isNull()) continue;
+        const std::string next = utils::escapeForLog(argument.name, kNameLimit) + "='" +
+                                 utils::escapeForLog(valueText(argument.value), kTextLimit) + '\'';
+        if (text.size() + next.size() > kArgumentsLimit) return text + " \\...";
+        text += (text.empty() ? "" : " ") + next;
+    }
+    return text;
+}
+
+}  // namespace
+
+std::string outcomeOf(const MethodResult& result) {
+    std::string text = "returned " + std::to_string(result.returnValue);
+    for (const Argument& output : result.outputs) {
+        if (output.value.type == CimType::Reference)
+            text += ", " + output.name + "=" + valueText(output.value);
+    }
+    return text;
+}
+
+std::string outcomeOf(CimStatus status, const std::string& description) {
+    if (status == CimStatus::AccessDenied) return "denied: " + description;
+    return "failed: " + description + " (CIM status " + std::to_string(static_cast<int>(status)) + ")";
+}
+
+std::string auditLine(const AuditEvent& event, const std::vector<Argument>& arguments) {
+    return "[audit]" + field("user", event.user, kNameLimit) + field("address", event.address, kNameLimit) +
+           field("operation", event.operation, kNameLimit) + field("target", event.target, kTextLimit) +
+           " arguments=\"" + argumentsText(arguments) + '"' + field("outcome", event.outcome, kTextLimit);
+}
+
+void audit(const AuditEvent& event, const std::vector<Argument>& arguments) noexcept {
+    try {
+        utils::writeAuditLog(auditLine(event, arguments));
+    } catch (...) {
+        // Without memory there is no line; the caller's work goes on.
+    }
+}
+
+}  // namespace core
