@@ -82,7 +82,9 @@ struct Response {
 /// no response. Thread-safe, no state.
 Response readResponse(std::string_view bytes);
 
-/// The response message, in the forms that the common clients read. Thread-safe, no state.
+/// The response message, in the forms that the common clients read. Thread-safe, no state. The second lets go
+/// of each object once it is written, so that values and text are never both whole.
 std::string writeResponse(const Response& response);
+std::string writeResponse(Response&& response);
 
 }  // namespace cimxml

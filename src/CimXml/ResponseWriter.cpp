@@ -1,4 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
+#include <concepts>
+
 #include "CimXml/ElementCodec.h"
 #include "CimXml/Response.h"
 
@@ -90,7 +92,10 @@ struct ContentWriter {
         writer.start("ERROR").attribute("CODE", std::to_string(static_cast<int>(error.status)));
         writer.attribute("DESCRIPTION", error.description).empty();
     }
-    void operator()(const IntrinsicResult& result) const {
+    /// Takes the objects out of a result that is not constant.
+    template <class Result>
+    requires std::same_as<std::remove_const_t<Result>, IntrinsicResult>
+    void operator()(Result& result) const {
         // A void operation has no IRETURNVALUE and an empty list has an empty one: clients tell them apart.
         if (result.kind != ResultKind::Nothing) {
             writer.open("IRETURNVALUE");
@@ -112,9 +117,15 @@ struct ContentWriter {
 
   private:
     template <class Objects>
-    void writeAll(const IntrinsicResult& result, const Objects& objects) const {
-        for (const auto& object : objects)
-            ResultWriter{writer, result, response.host}.write(object);
+    void writeAll(const IntrinsicResult& result, Objects& objects) const {
+        for (auto& object : objects) {
+            if constexpr (std::is_const_v<Objects>) {
+                ResultWriter{writer, result, response.host}.write(object);
+            } else {
+                const auto taken = std::move(object);
+                ResultWriter{writer, result, response.host}.write(taken);
+            }
+        }
     }
 
     void writeOutputs(const std::vector<core::Argument>& outputs) const {
@@ -125,9 +136,8 @@ struct ContentWriter {
     }
 };
 
-}  // namespace
-
-std::string writeResponse(const Response& response) {
+template <class AnyResponse>
+std::string write(AnyResponse& response) {
     std::string out;
     XmlWriter writer(out);
     const std::string_view element = response.isMethod ? "METHODRESPONSE" : "IMETHODRESPONSE";
@@ -137,6 +147,16 @@ std::string writeResponse(const Response& response) {
     writer.end(element);
     endEnvelope(writer, "SIMPLERSP");
     return out;
+}
+
+}  // namespace
+
+std::string writeResponse(const Response& response) {
+    return write(response);
+}
+
+std::string writeResponse(Response&& response) {
+    return write(response);
 }
 
 }  // namespace cimxml

@@ -18,7 +18,10 @@ struct ServerLimits {
     std::size_t headerBytes = 32U << 10;         ///< of one request, buffers of the connection included
     unsigned int connections = 256;              ///< and so connection threads
     unsigned int connectionsPerAddress = 64;
-    unsigned int workers = 16;             ///< requests carried out at a time
+    unsigned int workers = 16;          ///< requests carried out at a time
+    unsigned int requestsPerUser = 12;  ///< of those, by one user
+    std::size_t answerBytes =
+        256U << 20;  ///< of all large answers in hand, those of open enumerations included
     std::chrono::seconds headerTime{10};   ///< from the connection, or the end of idling, to the last header
     std::chrono::seconds requestTime{30};  ///< for a body to arrive, and for an answer to be taken
     std::chrono::seconds idleTime{60};     ///< between requests
@@ -27,6 +30,7 @@ struct ServerLimits {
 /// Pull enumerations: those that clients open and read in pieces.
 struct PullLimits {
     std::size_t open = 32;                 ///< enumerations open at a time
+    std::size_t openPerUser = 8;           ///< of those, by one user
     std::chrono::seconds timeout{180};     ///< between two pulls, unless the client asks for less or more
     std::chrono::seconds maxTimeout{600};  ///< what it may ask for
 };
@@ -54,6 +58,12 @@ struct AuthenticationSettings {
     std::chrono::seconds rememberFor{60};  ///< verified credentials; 0 remembers none
 };
 
+/// Which jobs that have ended the daemon keeps; 0 sets no bound.
+struct JobSettings {
+    std::size_t keep = 0;             ///< how many of them
+    std::chrono::seconds keepFor{0};  ///< how long, from their end
+};
+
 /// What the configuration file and the options say. Field by field documented in packaging/quenx-cimd.toml.
 struct Settings {
     ListenSettings listen;
@@ -61,6 +71,7 @@ struct Settings {
     AuthenticationSettings authentication;
     ServerLimits limits;
     PullLimits pulls;
+    JobSettings jobs;
     std::string providers;              ///< directory of the provider libraries
     std::string providerConfiguration;  ///< empty: the providers' own default
     std::string adapters;               ///< description of simulated adapters; empty: default

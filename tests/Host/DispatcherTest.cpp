@@ -43,14 +43,15 @@ class DispatcherTest : public ::testing::Test {
   protected:
     DispatcherTest()
         : m_dispatcher({std::make_shared<core::CimRequests>("root/cimv2")},
-                       {2, std::chrono::seconds(60), std::chrono::seconds(100)}) {
+                       {3, 2, std::chrono::seconds(60), std::chrono::seconds(100)}, 1U << 20) {
         m_agent.links().instances.add(new test::Link(m_a, m_b));
     }
 
     cimxml::Response answer(std::variant<cimxml::IntrinsicCall, cimxml::MethodCall> call) {
         // Over the wire, so that the texts of a message are typed as they are in the daemon.
         const cimxml::Request request = cimxml::readRequest(cimxml::writeRequest({"1", std::move(call)}));
-        const cimxml::Response response = m_dispatcher.dispatch(request, m_caller);
+        host::AnswerCharge charge = m_dispatcher.charge(m_caller.user);
+        const cimxml::Response response = m_dispatcher.dispatch(request, m_caller, charge);
         EXPECT_EQ(test::faultsOf(cimxml::writeResponse(response)), "");
         return response;
     }
@@ -338,10 +339,31 @@ TEST_F(DispatcherTest, PullsToTheEnd) {
     const std::string kept = output(open("1"), "EnumerationContext");
     open("1");
     EXPECT_EQ(status("OpenEnumerateInstancePaths", {{"ClassName", ClassName{"Test_Gadget"}}}), 27);
+    m_caller.user = "other";  // has as many, but not more than all together
+    open("1");
+    EXPECT_EQ(status("OpenEnumerateInstancePaths", {{"ClassName", ClassName{"Test_Gadget"}}}), 27);
+    m_caller.user = "admin";
     EXPECT_EQ(status("CloseEnumeration", {{"EnumerationContext", kept}}), 0);
     const auto paths =
         call("OpenReferenceInstancePaths", {{"InstanceName", gadget("b", "2")}, {"MaxObjectCount", "5"}});
     EXPECT_EQ(paths.paths.size(), 1U);
+}
+
+TEST_F(DispatcherTest, BoundsTheMemoryOfAnswers) {
+    for (unsigned int i = 0; i < 250; ++i)
+        m_agent.add("many", 100 + i);
+    const Given all{{"ClassName", ClassName{"Test_Gadget"}}};
+    const std::string context = output(call("OpenEnumerateInstances", all), "EnumerationContext");
+    // What an enumeration keeps counts until it has been read.
+    EXPECT_THROW(send("EnumerateInstances", all), host::OverBudget);
+    EXPECT_EQ(call("EnumerateInstanceNames", all).paths.size(), 253U);
+    const Given pull{{"EnumerationContext", context}, {"MaxObjectCount", "200"}};
+    EXPECT_EQ(call("PullInstancesWithPath", pull).instances.size(), 200U);
+    EXPECT_EQ(call("EnumerateInstances", all).instances.size(), 253U);
+    EXPECT_EQ(call("PullInstancesWithPath", pull).instances.size(), 53U);
+    for (unsigned int i = 0; i < 500; ++i)
+        m_agent.add("more", i);
+    EXPECT_EQ(status("EnumerateInstances", all), 27);  // waiting would not help
 }
 
 TEST_F(DispatcherTest, LeavesOneAuditLineForEachChangeAndRefusal) {

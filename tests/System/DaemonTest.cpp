@@ -70,6 +70,21 @@ TEST(DaemonTest, ServesEveryClassToRealAndRecordedClients) {
     }
 }
 
+TEST(DaemonTest, DeletesJobsThatHaveEndedWhenAskedTo) {
+    RunningDaemon daemon({"--jobs-keep-seconds", "1"}, {"QUENX_LOG=stderr"});
+    test::HeldFlash flash(daemon.folder() / "state/eth0");
+    const std::string job = startUpdate(daemon);
+    ASSERT_TRUE(reaches(daemon, job, "4"));
+    std::this_thread::sleep_for(std::chrono::seconds(3));
+    EXPECT_EQ(daemon.wbemcli("gi", job).status, 0);
+    flash.release();
+    EXPECT_TRUE(daemon.program().waitFor(
+        "[audit] user=\"quenx-cimd\" address=\"local\" operation=\"DeleteInstance\" "
+        "target=\"root/cimv2:Quenx_ConcreteJob.InstanceID=\\\"Quenx:FirmwareUpdate@Job#1\\\"\" "
+        "arguments=\"rule='jobs.keep_seconds'\" outcome=\"done\""));
+    EXPECT_TRUE(contains(daemon.wbemcli("gi", job).error, "(6) CIM_ERR_NOT_FOUND"));
+}
+
 TEST(DaemonTest, CarriesAnUpdateFromItsStartToItsDeletion) {
     RunningDaemon daemon;
     const std::string job = startUpdate(daemon);

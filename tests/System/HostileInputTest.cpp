@@ -6,6 +6,7 @@
 #include <algorithm>
 #include <chrono>
 #include <list>
+#include <map>
 #include <random>
 #include <thread>
 
@@ -32,7 +33,8 @@ class HostileInputTest : public ::testing::Test {
   protected:
     HostileInputTest()
         : m_daemon({"--limits-header-seconds", "3", "--limits-request-seconds", "4", "--limits-idle-seconds",
-                    "3", "--limits-connections", "200", "--limits-connections-per-address", "100"},
+                    "3", "--limits-connections", "200", "--limits-connections-per-address", "100",
+                    "--limits-answer-bytes", "4194304"},
                    {"QUENX_LOG=stderr"}),
           m_goodClient([this](const std::stop_token& stop) { goOnAsking(stop); }) {}
 
@@ -188,6 +190,29 @@ TEST_F(HostileInputTest, SurvivesGarbageInPlaceOfTls) {
     hello.send("\x16\x03\x01\x02\x01\xFC");
     hello.receive();
     EXPECT_EQ(m_daemon.wbemcli("ein", "CIM_Service", {}, true).status, 0);
+}
+
+TEST_F(HostileInputTest, BoundsTheMemoryOfAnswersThatNobodyReads) {
+    // All classes with their texts: large, and anybody who may read can have them.
+    std::string classes = test::readSample("w-EnumerateClasses.xml");
+    const std::string one =
+        "<IPARAMVALUE NAME=\"ClassName\"><CLASSNAME NAME=\"Quenx_ConcreteJob\"/></IPARAMVALUE>";
+    classes.erase(classes.find(one), one.size());
+    const std::string texts = "IncludeQualifiers\"><VALUE>FALSE";
+    classes.replace(classes.find(texts), texts.size(), "IncludeQualifiers\"><VALUE>TRUE");
+    std::list<RawConnection> readers;
+    for (int i = 0; i < 60; ++i) {
+        readers.emplace_back(m_daemon.httpPort(), kBadAddress, 4096);
+        readers.back().send(httpRequest(classes));
+    }
+    for (const RawConnection& reader : readers)
+        EXPECT_TRUE(reader.isAnswered());
+    std::map<int, int> answers;
+    for (const RawConnection& reader : readers)
+        ++answers[statusOf(reader.receive())];
+    EXPECT_GT(answers[200], 0);
+    EXPECT_GT(answers[503], 0);
+    EXPECT_EQ(answers[200] + answers[503], 60);
 }
 
 TEST_F(HostileInputTest, SurvivesTenThousandConnections) {

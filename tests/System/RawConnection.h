@@ -4,6 +4,7 @@
 #include <arpa/inet.h>
 #include <gtest/gtest.h>
 #include <netinet/in.h>
+#include <netinet/tcp.h>
 #include <sys/socket.h>
 #include <sys/time.h>
 #include <unistd.h>
@@ -20,10 +21,18 @@ namespace test {
 /// A TCP connection on loopback that sends what it is told, right or wrong.
 class RawConnection {
   public:
-    /// @param from  the address to come from, any of 127.0.0.0/8
-    RawConnection(int port, const char* from) : m_socket(::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0)) {
+    /// @param from    the address to come from, any of 127.0.0.0/8
+    /// @param buffer  bytes that this side takes before it reads; 0 for the system's choice
+    RawConnection(int port, const char* from, int buffer = 0)
+        : m_socket(::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0)) {
         const timeval patience{60, 0};
         ::setsockopt(m_socket, SOL_SOCKET, SO_RCVTIMEO, &patience, sizeof patience);
+        if (buffer != 0) {
+            // Both: with the large packets of loopback the other side would take megabytes into its own buffer.
+            const int packet = 536;
+            ::setsockopt(m_socket, SOL_SOCKET, SO_RCVBUF, &buffer, sizeof buffer);
+            ::setsockopt(m_socket, IPPROTO_TCP, TCP_MAXSEG, &packet, sizeof packet);
+        }
         sockaddr_in address{};
         address.sin_family = AF_INET;
         ::inet_pton(AF_INET, from, &address.sin_addr);
@@ -48,6 +57,11 @@ class RawConnection {
     }
     /// No more will be sent.
     void endSending() const { ::shutdown(m_socket, SHUT_WR); }
+    /// Waits for the first byte of an answer, and leaves it to be read.
+    bool isAnswered() const {
+        char first = 0;
+        return ::recv(m_socket, &first, 1, MSG_PEEK) == 1;
+    }
     /// What comes until the other side closes. Expects that within a minute, which is longer than a busy
     /// machine takes.
     std::string receive() const {

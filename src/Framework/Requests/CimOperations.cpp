@@ -5,6 +5,7 @@
 
 #include "Framework/Model/CimInstance.h"
 #include "Framework/Model/CimProperty.h"
+#include "Utils/Utils.h"
 
 namespace core {
 
@@ -99,6 +100,13 @@ std::optional<CimScalar> typedElement(CimType type, const CimScalar& value, cons
     return isSameKind(type, given.value.type) ? convertScalar(type, value) : std::nullopt;
 }
 
+/// An order in which the same names are equal. Names are not copied for it: most are too long for that.
+bool isFoldedBefore(std::string_view left, std::string_view right) {
+    return std::lexicographical_compare(
+        left.begin(), left.end(), right.begin(), right.end(),
+        [](char a, char b) { return utils::lowerCase(a) < utils::lowerCase(b); });
+}
+
 /// The value as the declaration wants it; nothing where it is of another kind, or does not fit.
 std::optional<CimValue> typedValue(const ParameterDeclaration& declared, const Argument& given,
                                    const ClassLookup& classes) {
@@ -135,12 +143,17 @@ std::vector<std::string> InstanceValue::texts(std::string_view name) const {
     return texts;
 }
 
-bool isWanted(const PropertyFilter& filter, std::string_view name) {
-    return !filter || std::any_of(filter->begin(), filter->end(),
-                                  [&](const std::string& wanted) { return sameName(wanted, name); });
+WantedProperties::WantedProperties(const PropertyFilter& filter) {
+    if (!filter) return;
+    m_names.emplace(filter->begin(), filter->end());
+    std::sort(m_names->begin(), m_names->end(), isFoldedBefore);
 }
 
-InstanceValue readInstance(CimInstance& instance, CimPath path, const PropertyFilter& filter,
+bool WantedProperties::includes(std::string_view name) const {
+    return !m_names || std::binary_search(m_names->begin(), m_names->end(), name, isFoldedBefore);
+}
+
+InstanceValue readInstance(CimInstance& instance, CimPath path, const WantedProperties& wanted,
                            const std::string& namespaceName) {
     InstanceValue result{std::move(path), {}};
     result.path.completeNamespace(namespaceName);
@@ -149,7 +162,7 @@ InstanceValue readInstance(CimInstance& instance, CimPath path, const PropertyFi
     const std::vector<CimProperty*> properties = instance.getProperties();
     result.properties.reserve(properties.size());
     for (const CimProperty* property : properties) {
-        if (isWanted(filter, property->getName()))
+        if (wanted.includes(property->getName()))
             result.properties.push_back(readProperty(*property, namespaceName));
     }
     return result;

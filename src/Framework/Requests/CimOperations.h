@@ -49,10 +49,20 @@ struct QUENX_EXPORT InstanceValue {
 /// ignored).
 using PropertyFilter = std::optional<std::vector<std::string>>;
 
-QUENX_EXPORT bool isWanted(const PropertyFilter& filter, std::string_view name);
+/// A filter made ready for one request: a client may send thousands of names, and every property of every
+/// instance is looked up among them. The filter must outlive it.
+class QUENX_EXPORT WantedProperties {
+  public:
+    explicit WantedProperties(const PropertyFilter& filter);
+    bool includes(std::string_view name) const;
+
+  private:
+    /// Sorted and not hashed: whoever sends the names could choose some that collide.
+    std::optional<std::vector<std::string_view>> m_names;
+};
 
 /// A copy of the instance, under its lock; paths in it are completed with the namespace.
-InstanceValue readInstance(CimInstance& instance, CimPath path, const PropertyFilter& filter,
+InstanceValue readInstance(CimInstance& instance, CimPath path, const WantedProperties& wanted,
                            const std::string& namespaceName);
 
 /// What narrows a walk over associations (DSP0200 5.4.2.8 to 5.4.2.11). An empty text narrows nothing.

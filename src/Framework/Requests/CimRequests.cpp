@@ -10,6 +10,7 @@
 #include "Framework/Classes/InstanceList.h"
 #include "Framework/Model/CimInstance.h"
 #include "Framework/Model/CimPropertyList.h"
+#include "Framework/Requests/AnswerMeter.h"
 #include "Framework/Requests/ServedClasses.h"
 #include "Utils/Exception.h"
 
@@ -99,9 +100,10 @@ CimRequests::CimRequests(std::string namespaceName) : m_namespace(std::move(name
 std::vector<InstanceValue> CimRequests::enumerateInstances(const std::string& className,
                                                            const PropertyFilter& filter) {
     return answerRequest([&](const ServedClasses& classes) {
+        const WantedProperties wanted(filter);
         std::vector<InstanceValue> result;
         visitInstances(classes, className, [&](CimInstance& instance, CimPath path) {
-            result.push_back(readInstance(instance, std::move(path), filter, m_namespace));
+            AnswerMeter::append(result, readInstance(instance, std::move(path), wanted, m_namespace));
         });
         return result;
     });
@@ -112,7 +114,7 @@ std::vector<CimPath> CimRequests::enumerateInstanceNames(const std::string& clas
         std::vector<CimPath> result;
         visitInstances(classes, className, [&](CimInstance&, CimPath path) {
             path.completeNamespace(m_namespace);
-            result.push_back(std::move(path));
+            AnswerMeter::append(result, std::move(path));
         });
         return result;
     });
@@ -123,7 +125,7 @@ InstanceValue CimRequests::getInstance(const CimPath& path, const PropertyFilter
         CimPath typed = classes.typed(path);
         CimInstance& instance = classes.requireInstance(typed);
         // Its own path: a client may have spelled names in another case.
-        return readInstance(instance, CimPath::of(instance), filter, m_namespace);
+        return readInstance(instance, CimPath::of(instance), WantedProperties(filter), m_namespace);
     });
 }
 

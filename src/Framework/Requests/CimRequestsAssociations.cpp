@@ -9,6 +9,7 @@
 #include "Framework/Model/CimError.h"
 #include "Framework/Model/CimInstance.h"
 #include "Framework/Model/CimProperty.h"
+#include "Framework/Requests/AnswerMeter.h"
 #include "Framework/Requests/CimRequests.h"
 #include "Framework/Requests/ServedClasses.h"
 
@@ -78,7 +79,8 @@ std::vector<CimPath> farEnds(const ServedClasses& classes, const CimPath& path, 
                         for (std::size_t i = 0; i < ends.size(); ++i) {
                             // An association of an object with itself is visited once for each end.
                             if (i == near || !leadsTo(classes, by, ends[i])) continue;
-                            if (seen.insert(ends[i].path.toString()).second) result.push_back(ends[i].path);
+                            if (seen.insert(ends[i].path.toString()).second)
+                                AnswerMeter::append(result, ends[i].path);
                         }
                     });
     return result;
@@ -126,11 +128,12 @@ void visitAssociations(const ServedClasses& classes, const CimPath& path, const 
 std::vector<InstanceValue> CimRequests::associators(const CimPath& path, const AssociationFilter& by,
                                                     const PropertyFilter& filter) {
     return answerRequest([&](const ServedClasses& classes) {
+        const WantedProperties wanted(filter);
         std::vector<InstanceValue> result;
         InstanceFinder finder;
         for (CimPath& far : farEnds(classes, path, by)) {
             if (CimInstance* instance = finder.find(far)) {
-                result.push_back(readInstance(*instance, std::move(far), filter, m_namespace));
+                AnswerMeter::append(result, readInstance(*instance, std::move(far), wanted, m_namespace));
             }
         }
         return result;
@@ -149,9 +152,10 @@ std::vector<CimPath> CimRequests::associatorNames(const CimPath& path, const Ass
 std::vector<InstanceValue> CimRequests::references(const CimPath& path, const AssociationFilter& by,
                                                    const PropertyFilter& filter) {
     return answerRequest([&](const ServedClasses& classes) {
+        const WantedProperties wanted(filter);
         std::vector<InstanceValue> result;
         visitAssociations(classes, path, by, [&](CimInstance& association, CimPath own) {
-            result.push_back(readInstance(association, std::move(own), filter, m_namespace));
+            AnswerMeter::append(result, readInstance(association, std::move(own), wanted, m_namespace));
         });
         return result;
     });
@@ -162,7 +166,7 @@ std::vector<CimPath> CimRequests::referenceNames(const CimPath& path, const Asso
         std::vector<CimPath> result;
         visitAssociations(classes, path, by, [&](CimInstance&, CimPath own) {
             own.completeNamespace(m_namespace);
-            result.push_back(std::move(own));
+            AnswerMeter::append(result, std::move(own));
         });
         return result;
     });

@@ -93,6 +93,7 @@ Daemon::Daemon(const Settings& settings)
     // Before the providers come, which ask for the adapters as soon as they are called.
     if (!m_settings.adapters.empty()) ma::configureSimulator(m_settings.adapters, m_settings.adapterState);
     loadProviders(m_session.libraries(), m_settings.providers);
+    m_retention.emplace(m_settings.jobs, m_session.operations());
     m_dispatcher = makeDispatcher();
     m_authentication = makeAuthentication();
     m_server = std::make_unique<HttpServer>(m_settings.limits, *m_dispatcher, *m_authentication);
@@ -113,7 +114,8 @@ std::unique_ptr<Dispatcher> Daemon::makeDispatcher() const {
     const InteropModel model(names, os::getHostname());
     for (std::size_t i = 1; i < names.size(); ++i)
         namespaces.push_back(std::make_shared<InteropNamespace>(names[i], implementation, model));
-    return std::make_unique<Dispatcher>(std::move(namespaces), m_settings.pulls);
+    return std::make_unique<Dispatcher>(std::move(namespaces), m_settings.pulls,
+                                        m_settings.limits.answerBytes);
 }
 
 std::unique_ptr<Authentication> Daemon::makeAuthentication() const {

@@ -3,10 +3,12 @@
 
 #include <cstdint>
 #include <memory>
+#include <optional>
 #include <string>
 #include <vector>
 
 #include "Framework/Requests/ProviderSession.h"
+#include "Host/Daemon/JobRetention.h"
 #include "Host/Server/HttpServer.h"
 #include "Host/Settings.h"
 #include "Utils/Os/Linux/FileLock.h"
@@ -80,6 +82,7 @@ class Daemon {
     std::string m_addresses;
     // Destroyed last to first: the server lets go of its requests before the providers leave.
     core::ProviderSession m_session;
+    std::optional<JobRetention> m_retention;
     std::unique_ptr<Dispatcher> m_dispatcher;
     std::unique_ptr<Authentication> m_authentication;
     std::unique_ptr<HttpServer> m_server;

@@ -71,28 +71,12 @@ std::string SettingsField::text() const {
         target);
 }
 
+namespace {
+
 // The texts are what `quenx-cimd --help` prints. The bounds keep one zero too many from using up the memory,
 // and one too few from refusing every client.
-std::vector<SettingsField> fieldsOf(Settings& s) {
-    return {{"listen.address", &s.listen.address, 0, 0, "address to listen on"},
-            {"listen.https", &s.listen.https, 0, 0, "serve HTTPS"},
-            {"listen.https_port", &s.listen.httpsPort, 0, 65535, "port for HTTPS; 0 picks a free one"},
-            {"listen.http", &s.listen.http, 0, 0, "serve plain HTTP too; it sends passwords in clear text"},
-            {"listen.http_port", &s.listen.httpPort, 0, 65535, "port for plain HTTP; 0 picks a free one"},
-            {"listen.socket", &s.listen.socket, 0, 0,
-             "Unix socket on which root of this machine is served without a password; empty for none"},
-            {"tls.certificate", &s.tls.certificate, 0, 0, "file with the certificate chain (PEM)"},
-            {"tls.key", &s.tls.key, 0, 0, "file with the private key (PEM)"},
-            {"tls.generate", &s.tls.generate, 0, 0,
-             "make a missing certificate and key, self-signed; those at the default paths are always made"},
-            {"auth.method", &s.authentication.method, 0, 0, "how passwords are checked: pam or users"},
-            {"auth.users_file", &s.authentication.usersFile, 0, 0,
-             "file with users and password hashes, for method users"},
-            {"auth.readers", &s.authentication.readers, 0, 0,
-             "who may read besides administrators, for method pam: user names, @group, or * for everybody"},
-            {"auth.remember_seconds", &s.authentication.rememberFor, 0, 3600,
-             "how long a verified password is remembered; 0 for not at all"},
-            {"limits.body_bytes", &s.limits.bodyBytes, 1024, kGibibyte, "largest request body"},
+std::vector<SettingsField> limitFields(Settings& s) {
+    return {{"limits.body_bytes", &s.limits.bodyBytes, 1024, kGibibyte, "largest request body"},
             {"limits.anonymous_body_bytes", &s.limits.anonymousBodyBytes, 0, kGibibyte,
              "how much is read of a request that is refused"},
             {"limits.header_bytes", &s.limits.headerBytes, 4096, 1U << 20, "largest request headers"},
@@ -101,15 +85,28 @@ std::vector<SettingsField> fieldsOf(Settings& s) {
             {"limits.connections_per_address", &s.limits.connectionsPerAddress, 1, 4096,
              "most connections from one address"},
             {"limits.workers", &s.limits.workers, 1, 4096, "most requests carried out at a time"},
+            {"limits.requests_per_user", &s.limits.requestsPerUser, 1, 4096,
+             "most requests of one user carried out at a time; further ones wait"},
+            {"limits.answer_bytes", &s.limits.answerBytes, 1U << 20, kGibibyte * 64,
+             "most memory for large answers that clients have not read yet"},
             {"limits.header_seconds", &s.limits.headerTime, 1, kDay, "time for the headers to arrive"},
             {"limits.request_seconds", &s.limits.requestTime, 1, kDay,
              "time for a body to arrive, and for the client to take the answer"},
             {"limits.idle_seconds", &s.limits.idleTime, 1, kDay, "time between two requests on a connection"},
             {"limits.enumerations", &s.pulls.open, 1, 100000, "most open pull enumerations"},
+            {"limits.enumerations_per_user", &s.pulls.openPerUser, 1, 100000,
+             "most open pull enumerations of one user"},
             {"limits.enumeration_seconds", &s.pulls.timeout, 1, kDay,
              "time between two pulls, unless the client asks for another"},
             {"limits.enumeration_most_seconds", &s.pulls.maxTimeout, 1, kDay,
-             "longest time between two pulls that a client may ask for"},
+             "longest time between two pulls that a client may ask for"}};
+}
+
+std::vector<SettingsField> otherFields(Settings& s) {
+    return {{"jobs.keep", &s.jobs.keep, 0, 1000000,
+             "how many jobs that have ended are kept; 0 for all, until a client deletes them"},
+            {"jobs.keep_seconds", &s.jobs.keepFor, 0, kDay * 366,
+             "how many seconds a job is kept after its end; 0 for ever"},
             {"providers.directory", &s.providers, 0, 0, "directory of the provider libraries"},
             {"providers.configuration", &s.providerConfiguration, 0, 0,
              "the providers' own configuration file, instead of /etc/quenx-cimprovider.conf"},
@@ -118,6 +115,35 @@ std::vector<SettingsField> fieldsOf(Settings& s) {
             {"adapters.state", &s.adapterState, 0, 0,
              "directory in which they keep their flash, instead of /var/lib/quenx/adapters"},
             {"daemon.lock_file", &s.lockFile, 0, 0, "file that is locked while quenx-cimd runs"}};
+}
+
+}  // namespace
+
+std::vector<SettingsField> fieldsOf(Settings& s) {
+    std::vector<SettingsField> fields{
+        {"listen.address", &s.listen.address, 0, 0, "address to listen on"},
+        {"listen.https", &s.listen.https, 0, 0, "serve HTTPS"},
+        {"listen.https_port", &s.listen.httpsPort, 0, 65535, "port for HTTPS; 0 picks a free one"},
+        {"listen.http", &s.listen.http, 0, 0, "serve plain HTTP too; it sends passwords in clear text"},
+        {"listen.http_port", &s.listen.httpPort, 0, 65535, "port for plain HTTP; 0 picks a free one"},
+        {"listen.socket", &s.listen.socket, 0, 0,
+         "Unix socket on which root of this machine is served without a password; empty for none"},
+        {"tls.certificate", &s.tls.certificate, 0, 0, "file with the certificate chain (PEM)"},
+        {"tls.key", &s.tls.key, 0, 0, "file with the private key (PEM)"},
+        {"tls.generate", &s.tls.generate, 0, 0,
+         "make a missing certificate and key, self-signed; those at the default paths are always made"},
+        {"auth.method", &s.authentication.method, 0, 0, "how passwords are checked: pam or users"},
+        {"auth.users_file", &s.authentication.usersFile, 0, 0,
+         "file with users and password hashes, for method users"},
+        {"auth.readers", &s.authentication.readers, 0, 0,
+         "who may read besides administrators, for method pam: user names, @group, or * for everybody"},
+        {"auth.remember_seconds", &s.authentication.rememberFor, 0, 3600,
+         "how long a verified password is remembered; 0 for not at all"}};
+    for (auto* more : {&limitFields, &otherFields}) {
+        for (SettingsField& field : more(s))
+            fields.push_back(std::move(field));
+    }
+    return fields;
 }
 
 void checkSettings(const Settings& s) {

@@ -101,9 +101,9 @@ ClassDeclaration answerOf(const core::ClassChain& chain, const ClassOptions& opt
     ClassDeclaration answer = completeClass(chain);
     // Narrowed at the end: what a class redeclares is only known once the whole is built.
     if (options.localOnly) dropPropagated(answer);
-    std::erase_if(answer.properties, [&](const PropertyDeclaration& property) {
-        return !core::isWanted(options.properties, property.name);
-    });
+    const core::WantedProperties wanted(options.properties);
+    std::erase_if(answer.properties,
+                  [&](const PropertyDeclaration& property) { return !wanted.includes(property.name); });
     if (!options.includeClassOrigin) forEachElement(answer, [](auto& element) { element.origin.clear(); });
     if (!options.includeQualifiers)
         forEachQualifierList(answer, [](auto& qualifiers) { qualifiers.clear(); });

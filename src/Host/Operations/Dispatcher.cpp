@@ -64,8 +64,8 @@ void auditRequest(const cimxml::Request& request, const Caller& caller,
 
 }  // namespace
 
-Dispatcher::Dispatcher(Namespaces namespaces, const PullLimits& limits)
-    : m_namespaces(std::move(namespaces)), m_enumerations(limits) {}
+Dispatcher::Dispatcher(Namespaces namespaces, const PullLimits& limits, std::size_t answerBytes)
+    : m_namespaces(std::move(namespaces)), m_budget(answerBytes), m_enumerations(limits) {}
 
 core::CimOperations& Dispatcher::findNamespace(const std::string& name) const {
     for (const auto& each : m_namespaces) {
@@ -74,7 +74,8 @@ core::CimOperations& Dispatcher::findNamespace(const std::string& name) const {
     throw CimError(CimStatus::InvalidNamespace, "no namespace \"" + name + "\"");
 }
 
-IntrinsicResult Dispatcher::callOperation(const cimxml::IntrinsicCall& call, const Caller& caller) {
+IntrinsicResult Dispatcher::callOperation(const cimxml::IntrinsicCall& call, const Caller& caller,
+                                          AnswerCharge& charge) {
     const Operation* operation = findOperation(call.operation);
     if (operation != nullptr) requirePrivilege(operation->privilege, caller);
     // The namespace before the operation: clients probe for namespaces with whatever operation they like.
@@ -82,7 +83,8 @@ IntrinsicResult Dispatcher::callOperation(const cimxml::IntrinsicCall& call, con
     if (operation == nullptr) {
         throw CimError(CimStatus::NotSupported, "operation " + call.operation + " is not supported");
     }
-    return operation->handler({target, caller, m_enumerations}, Parameters(call, operation->parameters));
+    return operation->handler({target, caller, m_enumerations, charge},
+                              Parameters(call, operation->parameters));
 }
 
 core::MethodResult Dispatcher::callMethod(const cimxml::MethodCall& call, const Caller& caller) {
@@ -96,19 +98,22 @@ core::MethodResult Dispatcher::callMethod(const cimxml::MethodCall& call, const 
     return target.invokeMethod(call.object, call.method, call.arguments);
 }
 
-cimxml::Response Dispatcher::dispatch(const cimxml::Request& request, const Caller& caller) {
-    cimxml::Response response = carryOut(request, caller);
+cimxml::Response Dispatcher::dispatch(const cimxml::Request& request, const Caller& caller,
+                                      AnswerCharge& charge) {
+    cimxml::Response response = carryOut(request, caller, charge);
     // However it ended: that somebody was refused is worth knowing, too.
     if (isAudited(request)) auditRequest(request, caller, response);
     return response;
 }
 
-cimxml::Response Dispatcher::carryOut(const cimxml::Request& request, const Caller& caller) {
+cimxml::Response Dispatcher::carryOut(const cimxml::Request& request, const Caller& caller,
+                                      AnswerCharge& charge) {
     cimxml::Response response;
     response.messageId = request.messageId;
     response.name = request.name();
     response.isMethod = std::holds_alternative<cimxml::MethodCall>(request.call);
     response.host = caller.host;
+    const ChargingMeter meter(charge);
     try {
         if (m_shuttingDown.load()) {
             throw CimError(CimStatus::ServerIsShuttingDown, "the server is shutting down");
@@ -116,10 +121,15 @@ cimxml::Response Dispatcher::carryOut(const cimxml::Request& request, const Call
         if (const auto* method = std::get_if<cimxml::MethodCall>(&request.call)) {
             response.content = callMethod(*method, caller);
         } else {
-            response.content = callOperation(std::get<cimxml::IntrinsicCall>(request.call), caller);
+            response.content = callOperation(std::get<cimxml::IntrinsicCall>(request.call), caller, charge);
         }
     } catch (const CimError& error) {
         response.content = ErrorResult{error.status(), error.what()};
+    } catch (const OverBudget&) {
+        // Those that nobody reads on are let go of by the way, and nobody may come by if all are refused
+        // here.
+        m_enumerations.dropExpired();
+        throw;
     } catch (const std::bad_alloc&) {
         // Most of what the request took is free again, so the small answer fits.
         response.content = ErrorResult{CimStatus::Failed, "out of memory"};

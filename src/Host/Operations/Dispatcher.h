@@ -16,22 +16,29 @@ class Dispatcher {
   public:
     using Namespaces = std::vector<std::shared_ptr<core::CimOperations>>;
 
-    explicit Dispatcher(Namespaces namespaces, const PullLimits& limits = {});
+    explicit Dispatcher(Namespaces namespaces, const PullLimits& limits = {},
+                        std::size_t answerBytes = ServerLimits().answerBytes);
 
-    /// Never throws for what a request asks or a provider does, memory exhaustion included. Leaves an audit
-    /// line for each call that changes something, or would if it were allowed.
-    cimxml::Response dispatch(const cimxml::Request& request, const Caller& caller);
+    /// A charge for an answer to the user.
+    AnswerCharge charge(const std::string& user) { return {m_budget, user}; }
+
+    /// Throws OverBudget, and nothing else for what a request asks or a provider does, memory exhaustion
+    /// included. Leaves an audit line for each call that changes something, or would if it were allowed.
+    /// @param charge  of the answer
+    cimxml::Response dispatch(const cimxml::Request& request, const Caller& caller, AnswerCharge& charge);
 
     /// From now on every request is answered with "server is shutting down".
     void shutDown() { m_shuttingDown.store(true); }
 
   private:
-    cimxml::Response carryOut(const cimxml::Request& request, const Caller& caller);
-    cimxml::IntrinsicResult callOperation(const cimxml::IntrinsicCall& call, const Caller& caller);
+    cimxml::Response carryOut(const cimxml::Request& request, const Caller& caller, AnswerCharge& charge);
+    cimxml::IntrinsicResult callOperation(const cimxml::IntrinsicCall& call, const Caller& caller,
+                                          AnswerCharge& charge);
     core::MethodResult callMethod(const cimxml::MethodCall& call, const Caller& caller);
     core::CimOperations& findNamespace(const std::string& name) const;
 
     const Namespaces m_namespaces;
+    AnswerBudget m_budget;
     OpenEnumerations m_enumerations;
     std::atomic<bool> m_shuttingDown{false};
 };

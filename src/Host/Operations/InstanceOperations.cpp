@@ -15,10 +15,11 @@ const core::PropertyFilter kNoProperties{std::vector<std::string>()};
 /// The properties of the named class only, narrowed by the client's list. Instances of subclasses are
 /// answered too, without the properties that the subclasses add (DSP0200 5.4.2.4).
 core::PropertyFilter shallowFilter(const core::ClassChain& chain, const core::PropertyFilter& wanted) {
+    const core::WantedProperties filter(wanted);
     std::vector<std::string> names;
     for (const auto& declaration : chain) {
         for (const core::PropertyDeclaration& property : declaration->properties) {
-            if (core::isWanted(wanted, property.name)) names.push_back(property.name);
+            if (filter.includes(property.name)) names.push_back(property.name);
         }
     }
     return names;

@@ -22,9 +22,9 @@ constexpr std::array<const char*, 3> kShown{"CIM_RegisteredProfile", "CIM_Refere
 const core::PropertyFilter kNoProperties{std::vector<std::string>()};
 
 InstanceValue filtered(InstanceValue instance, const core::PropertyFilter& filter) {
-    std::erase_if(instance.properties, [&](const core::PropertyValue& property) {
-        return !core::isWanted(filter, property.name);
-    });
+    const core::WantedProperties wanted(filter);
+    std::erase_if(instance.properties,
+                  [&](const core::PropertyValue& property) { return !wanted.includes(property.name); });
     return instance;
 }
 

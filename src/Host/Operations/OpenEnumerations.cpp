@@ -51,6 +51,15 @@ IntrinsicResult takeNext(IntrinsicResult& rest, std::size_t count) {
     return part;
 }
 
+std::size_t bytesOf(const IntrinsicResult& result) {
+    std::size_t bytes = 0;
+    for (const core::InstanceValue& instance : result.instances)
+        bytes += core::bytesOf(instance);
+    for (const core::CimPath& path : result.paths)
+        bytes += core::bytesOf(path);
+    return bytes;
+}
+
 bool isEmpty(const IntrinsicResult& rest) {
     return rest.instances.empty() && rest.paths.empty();
 }
@@ -73,6 +82,11 @@ std::chrono::seconds OpenEnumerations::checkedTimeout(std::optional<std::uint32_
 }
 
 void OpenEnumerations::dropExpired() {
+    const utils::Mutex::AutoLocker lock(m_mutex);
+    dropExpiredLocked();
+}
+
+void OpenEnumerations::dropExpiredLocked() {
     // Whenever somebody comes by: with a limit on their number, expired ones need no thread that removes
     // them.
     std::erase_if(m_entries, [now = Clock::now()](const auto& each) { return each.second.expires <= now; });
@@ -80,15 +94,28 @@ void OpenEnumerations::dropExpired() {
 
 OpenEnumerations::Entries::iterator OpenEnumerations::find(const EnumerationOwner& owner,
                                                            const std::string& context) {
-    dropExpired();
+    dropExpiredLocked();
     const auto found = m_entries.find(context);
     // Somebody else's context is answered as an unknown one, which tells nothing.
     if (found == m_entries.end() || found->second.owner != owner) refuseContext();
     return found;
 }
 
+void OpenEnumerations::requireRoomFor(const EnumerationOwner& owner) {
+    dropExpiredLocked();
+    const auto own = std::count_if(m_entries.begin(), m_entries.end(),
+                                   [&](const auto& each) { return each.second.owner.user == owner.user; });
+    if (static_cast<std::size_t>(own) >= m_limits.openPerUser) {
+        throw CimError(CimStatus::ServerLimitsExceeded,
+                       "user " + owner.user + " has too many enumerations open");
+    }
+    if (m_entries.size() >= m_limits.open)
+        throw CimError(CimStatus::ServerLimitsExceeded, "too many enumerations are open");
+}
+
 IntrinsicResult OpenEnumerations::open(const EnumerationOwner& owner, IntrinsicResult result,
-                                       std::size_t count, std::optional<std::uint32_t> timeoutSeconds) {
+                                       std::size_t count, std::optional<std::uint32_t> timeoutSeconds,
+                                       AnswerCharge& charge) {
     const std::chrono::seconds timeout = checkedTimeout(timeoutSeconds);
     // The rest is kept in the reverse order and taken from its end, so that each pull costs what it delivers
     // and frees it.
@@ -103,21 +130,21 @@ IntrinsicResult OpenEnumerations::open(const EnumerationOwner& owner, IntrinsicR
     const std::string context = newContext();
     const utils::Mutex::AutoLocker lock(m_mutex);
     // Checked last: only a result that is kept takes memory that needs a bound.
-    dropExpired();
-    if (m_entries.size() >= m_limits.open) {
-        throw CimError(CimStatus::ServerLimitsExceeded, "too many enumerations are open");
-    }
-    m_entries[context] = {owner, std::move(result), timeout, Clock::now() + timeout};
+    requireRoomFor(owner);
+    AnswerCharge kept = charge.split(bytesOf(result));
+    m_entries.emplace(context,
+                      Entry{owner, std::move(kept), std::move(result), timeout, Clock::now() + timeout});
     addOutputs(part, false, context);
     return part;
 }
 
 IntrinsicResult OpenEnumerations::pull(const EnumerationOwner& owner, cimxml::ResultKind kind,
-                                       const std::string& context, std::size_t count) {
+                                       const std::string& context, std::size_t count, AnswerCharge& charge) {
     const utils::Mutex::AutoLocker lock(m_mutex);
     const auto found = find(owner, context);
     if (found->second.rest.kind != kind) refuseContext();
     IntrinsicResult part = takeNext(found->second.rest, count);
+    found->second.charge.moveTo(charge, bytesOf(part));
     const bool ended = isEmpty(found->second.rest);
     addOutputs(part, ended, ended ? "" : context);
     if (ended) {

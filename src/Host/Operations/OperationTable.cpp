@@ -62,13 +62,13 @@ IntrinsicResult open(const OperationContext& context, const Parameters& paramete
     IntrinsicResult result = Handler(context, parameters);
     result.kind = Form;
     return context.enumerations.open(ownerOf(context), std::move(result), countOf(parameters),
-                                     parameters.number("OperationTimeout"));
+                                     parameters.number("OperationTimeout"), context.charge);
 }
 
 template <ResultKind Form>
 IntrinsicResult pull(const OperationContext& context, const Parameters& parameters) {
     return context.enumerations.pull(ownerOf(context), Form, parameters.text(kContext.name),
-                                     countOf(parameters));
+                                     countOf(parameters), context.charge);
 }
 
 IntrinsicResult close(const OperationContext& context, const Parameters& parameters) {

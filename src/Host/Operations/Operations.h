@@ -29,6 +29,7 @@ struct OperationContext {
     core::CimOperations& target;  ///< the namespace that the client addressed
     const Caller& caller;
     OpenEnumerations& enumerations;
+    AnswerCharge& charge;  ///< of the answer
 };
 
 /// An intrinsic operation. Handlers throw CimError.

@@ -61,17 +61,21 @@ HttpAnswer answerOf(AuthenticationOutcome outcome) {
     }
 }
 
-// The HTTP library may send the body after our last function has returned, so it owns it.
+/// What the HTTP library owns, since it may send the body after our last function has returned.
+struct Body {
+    std::optional<AnswerCharge> charge;  // first: given back when the text has gone
+    std::string text;
+};
+
 void freeBody(void* body) {
-    delete static_cast<std::string*>(body);
+    delete static_cast<Body*>(body);
 }
 
 /// The response takes the body over without copying it.
 MHD_Response* makeResponse(HttpAnswer& answer) {
-    auto body = std::make_unique<std::string>(std::move(answer.body));
-    std::string& text = *body;
+    std::unique_ptr<Body> body(new Body{std::move(answer.charge), std::move(answer.body)});
     MHD_Response* response = ::MHD_create_response_from_buffer_with_free_callback_cls(
-        text.size(), text.data(), freeBody, body.get());
+        body->text.size(), body->text.data(), freeBody, body.get());
     if (response != nullptr) body.release();
     return response;
 }
@@ -147,9 +151,14 @@ void HttpRequest::take(const char* data, std::size_t size) {
 HttpAnswer HttpRequest::carryOut() {
     // From here on the time is ours: an operation may read an image of many megabytes.
     m_server.m_watch->suspend(m_socket);
+    // Root on the spot has places of his own; no user of the network has a colon in his name.
+    const std::string user = isLocal() ? "unix:" + m_user.name : m_user.name;
+    const HeldUserSlot own(m_server.m_userSlots, user, m_server.m_limits.requestTime);
+    if (!own) return HttpAnswer::withHeader(503, "Retry-After", "10");
     Slots& workers = isLocal() ? m_server.m_localWorkers : m_server.m_workers;
     const HeldSlot worker(workers, m_server.m_limits.requestTime);
     if (!worker) return HttpAnswer::withHeader(503, "Retry-After", "10");
+    AnswerCharge charge = m_server.m_dispatcher.charge(user);
     try {
         const cimxml::Request request = cimxml::readRequest(m_body);
         cimxml::checkHeadersAgainst(m_head.cim, request);
@@ -159,10 +168,15 @@ HttpAnswer HttpRequest::carryOut() {
         // them.
         const Caller caller{m_user.name, m_user.isAdministrator,
                             m_head.host.empty() ? "localhost" : m_head.host, m_head.address};
-        const cimxml::Response response = m_server.m_dispatcher.dispatch(request, caller);
-        return {200,
-                {{"Content-Type", "application/xml; charset=\"utf-8\""}, {"CIMOperation", "MethodResponse"}},
-                cimxml::writeResponse(response)};
+        HttpAnswer answer{
+            200,
+            {{"Content-Type", "application/xml; charset=\"utf-8\""}, {"CIMOperation", "MethodResponse"}},
+            cimxml::writeResponse(m_server.m_dispatcher.dispatch(request, caller, charge))};
+        charge.set(answer.body.capacity());
+        answer.charge.emplace(std::move(charge));
+        return answer;
+    } catch (const OverBudget&) {
+        return HttpAnswer::withHeader(503, "Retry-After", "10");
     } catch (const cimxml::WireError& error) {
         QUENX_DEBUG("refused a request from %s: %s", m_head.address.c_str(),
                     utils::escapeForFormat(error.what()).c_str());

@@ -12,6 +12,7 @@
 #include "CimXml/Request.h"
 #include "CimXml/WireError.h"
 #include "Host/Authentication/PasswordChecker.h"
+#include "Host/Operations/AnswerBudget.h"
 
 namespace host {
 
@@ -32,6 +33,7 @@ struct HttpAnswer {
     unsigned int status = 200;
     std::vector<std::pair<std::string, std::string>> headers;
     std::string body;
+    std::optional<AnswerCharge> charge = std::nullopt;  ///< of a large body
 
     /// Without a body, here and below.
     static HttpAnswer plain(unsigned int status) { return {status, {}, ""}; }

@@ -105,6 +105,7 @@ HttpServer::HttpServer(const ServerLimits& limits, Dispatcher& dispatcher, Authe
     : m_limits(limits),
       m_dispatcher(dispatcher),
       m_authentication(authentication),
+      m_userSlots(limits.requestsPerUser),
       m_workers(static_cast<std::ptrdiff_t>(limits.workers)),
       m_localWorkers(static_cast<std::ptrdiff_t>(ConnectionWatch::kLocalConnections)),
       m_watch(std::make_unique<ConnectionWatch>(limits)) {}

@@ -11,6 +11,7 @@
 
 #include "Host/Authentication/Authentication.h"
 #include "Host/Server/Acceptor.h"
+#include "Host/Server/UserSlots.h"
 #include "Host/Settings.h"
 
 struct MHD_Daemon;
@@ -73,6 +74,7 @@ class HttpServer {
     const ServerLimits m_limits;
     Dispatcher& m_dispatcher;
     Authentication& m_authentication;
+    UserSlots m_userSlots;
     Slots m_workers;
     Slots m_localWorkers;
     std::atomic<unsigned int> m_inFlight{0};

@@ -1,0 +1,89 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "Host/Daemon/JobRetention.h"
+
+#include <algorithm>
+
+#include "Framework/Requests/Audit.h"
+#include "Providers/Schema/ValueMaps.h"
+
+namespace host {
+
+namespace {
+
+constexpr const char* kJobClass = "Quenx_ConcreteJob";
+
+/// Completed or failed: the two ends of an update. Whatever else a state says, somebody may still want the
+/// job.
+bool hasEnded(const core::InstanceValue& job) {
+    const std::uint64_t state = job.number("JobState");
+    return state == JobStateCompleted || state == JobStateException;
+}
+
+}  // namespace
+
+EndedJobs::Surplus EndedJobs::look(const std::vector<core::InstanceValue>& jobs, Clock::time_point now) {
+    std::map<std::string, Clock::time_point> seen;
+    std::vector<std::pair<Clock::time_point, const core::CimPath*>> ended;
+    for (const core::InstanceValue& job : jobs) {
+        if (!hasEnded(job)) continue;
+        const std::string name = job.path.toString();
+        const auto known = m_firstSeen.find(name);
+        const auto since = known == m_firstSeen.end() ? now : known->second;
+        seen.emplace(name, since);
+        ended.emplace_back(since, &job.path);
+    }
+    m_firstSeen = std::move(seen);  // without those that are gone
+    const auto isOlder = [](const auto& left, const auto& right) { return left.first < right.first; };
+    std::stable_sort(ended.begin(), ended.end(), isOlder);
+    Surplus surplus;
+    for (std::size_t i = 0; i < ended.size(); ++i) {
+        const auto& [since, path] = ended[i];
+        if (m_settings.keep != 0 && ended.size() - i > m_settings.keep) {
+            surplus.emplace_back(*path, "jobs.keep");
+        } else if (m_settings.keepFor.count() != 0 && now - since >= m_settings.keepFor) {
+            surplus.emplace_back(*path, "jobs.keep_seconds");
+        }
+    }
+    return surplus;
+}
+
+JobRetention::JobRetention(const JobSettings& settings, std::shared_ptr<core::CimOperations> operations)
+    : m_jobs(settings), m_operations(std::move(operations)) {
+    constexpr std::chrono::seconds kLongest{10};
+    if (settings.keep == 0 && settings.keepFor.count() == 0) return;
+    const auto pause = settings.keepFor.count() == 0
+                           ? kLongest
+                           : std::clamp(settings.keepFor / 10, std::chrono::seconds(1), kLongest);
+    m_thread = std::jthread([this, pause](const std::stop_token& stop) { run(stop, pause); });
+}
+
+void JobRetention::run(const std::stop_token& stop, std::chrono::seconds pause) {
+    std::mutex mutex;
+    std::condition_variable_any stopped;  // nobody calls it: only the time or the stop ends a wait
+    std::unique_lock lock(mutex);
+    while (!stopped.wait_for(lock, stop, pause, [&] { return stop.stop_requested(); })) {
+        try {
+            sweep();
+        } catch (const std::exception&) {
+            // No provider here serves jobs, or there is no memory: the next look may do better.
+        }
+    }
+}
+
+void JobRetention::sweep() {
+    const auto jobs = m_operations->enumerateInstances(kJobClass, {{"JobState"}});
+    for (const auto& [path, setting] : m_jobs.look(jobs, EndedJobs::Clock::now())) {
+        std::string outcome = "done";
+        try {
+            m_operations->deleteInstance(path);
+        } catch (const core::CimError& error) {
+            // A client deleted it meanwhile.
+            if (error.status() == core::CimStatus::NotFound) continue;
+            outcome = core::outcomeOf(error.status(), error.what());
+        }
+        const auto rule = core::CimValue::of(core::CimType::String, setting);
+        core::audit({"quenx-cimd", "local", "DeleteInstance", path.toString(), outcome}, {{"rule", rule}});
+    }
+}
+
+}  // namespace host

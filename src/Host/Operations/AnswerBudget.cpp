@@ -1,0 +1,110 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "Host/Operations/AnswerBudget.h"
+
+#include <malloc.h>
+
+#include <algorithm>
+#include <utility>
+
+#include "Framework/Model/CimError.h"
+
+namespace host {
+
+namespace {
+
+/// Answers up to this size are not counted: there are at most as many as connections. Larger ones are counted
+/// in multiples of it, so that the budget is asked once for many values.
+constexpr std::size_t kUncounted = std::size_t{64} << 10;
+
+/// From this size on the memory of an answer is handed back to the system. The C library would keep it, once
+/// for each of its arenas.
+constexpr std::size_t kTrimmed = std::size_t{16} << 20;
+
+std::size_t countedOf(std::size_t bytes) {
+    return bytes <= kUncounted ? 0 : (bytes + kUncounted - 1) / kUncounted * kUncounted;
+}
+
+}  // namespace
+
+bool AnswerBudget::take(const std::string& user, std::size_t bytes) {
+    const utils::Mutex::AutoLocker lock(m_mutex);
+    std::size_t& own = m_byUser[user];
+    const bool fits = bytes <= m_bytes - m_taken && own + bytes <= share();
+    if (fits) {
+        own += bytes;
+        m_taken += bytes;
+    } else if (own == 0) {
+        m_byUser.erase(user);
+    }
+    return fits;
+}
+
+void AnswerBudget::giveBack(const std::string& user, std::size_t bytes) noexcept {
+    const utils::Mutex::AutoLocker lock(m_mutex);
+    m_taken -= bytes;
+    const auto own = m_byUser.find(user);
+    own->second -= bytes;
+    if (own->second == 0) m_byUser.erase(own);
+}
+
+AnswerCharge::AnswerCharge(AnswerCharge&& other) noexcept
+    : m_budget(other.m_budget),
+      m_user(std::move(other.m_user)),
+      m_bytes(std::exchange(other.m_bytes, 0)),
+      m_reserved(std::exchange(other.m_reserved, 0)),
+      m_peak(std::exchange(other.m_peak, 0)) {}
+
+AnswerCharge& AnswerCharge::operator=(AnswerCharge&& other) noexcept {
+    // What was charged here goes with the other.
+    std::swap(m_budget, other.m_budget);
+    m_user.swap(other.m_user);
+    std::swap(m_bytes, other.m_bytes);
+    std::swap(m_reserved, other.m_reserved);
+    std::swap(m_peak, other.m_peak);
+    return *this;
+}
+
+AnswerCharge::~AnswerCharge() {
+    if (m_reserved != 0) m_budget->giveBack(m_user, m_reserved);
+    if (m_peak >= kTrimmed) ::malloc_trim(0);
+}
+
+bool AnswerCharge::reserve() {
+    const std::size_t counted = countedOf(m_bytes);
+    if (counted > m_reserved && !m_budget->take(m_user, counted - m_reserved)) return false;
+    if (counted < m_reserved) m_budget->giveBack(m_user, m_reserved - counted);
+    m_reserved = counted;
+    m_peak = std::max(m_peak, m_reserved);
+    return true;
+}
+
+void AnswerCharge::add(std::size_t bytes) {
+    m_bytes += bytes;
+    if (countedOf(m_bytes) <= m_reserved || reserve()) return;
+    if (countedOf(m_bytes) <= m_budget->share()) throw OverBudget();
+    throw core::CimError(core::CimStatus::ServerLimitsExceeded,
+                         "the answer is larger than limits.answer_bytes of the server allows; ask for fewer "
+                         "properties, or for a class with fewer instances");
+}
+
+void AnswerCharge::set(std::size_t bytes) {
+    m_bytes = bytes;
+    if (!reserve()) throw OverBudget();
+}
+
+void AnswerCharge::moveTo(AnswerCharge& other, std::size_t bytes) {
+    m_bytes -= std::min(m_bytes, bytes);
+    other.m_bytes += bytes;
+    const std::size_t kept = std::min(m_reserved, countedOf(m_bytes));
+    other.m_reserved += m_reserved - kept;
+    other.m_peak = std::max(other.m_peak, other.m_reserved);
+    m_reserved = kept;
+}
+
+AnswerCharge AnswerCharge::split(std::size_t bytes) {
+    AnswerCharge part(*m_budget, m_user);
+    moveTo(part, bytes);
+    return part;
+}
+
+}  // namespace host

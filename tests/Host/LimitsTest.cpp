@@ -1,0 +1,93 @@
+// SPDX-License-Identifier: Apache-2.0
+// What bounds the work and the memory that clients can make the daemon spend.
+#include <gtest/gtest.h>
+
+#include <ctime>
+
+#include "Framework/Model/CimError.h"
+#include "Host/Daemon/JobRetention.h"
+#include "Host/Operations/AnswerBudget.h"
+#include "Host/Server/UserSlots.h"
+
+namespace {
+
+using namespace std::chrono_literals;
+using host::AnswerCharge;
+using host::OverBudget;
+
+constexpr std::size_t kMebibyte = 1U << 20;
+
+TEST(AnswerBudgetTest, KeepsRoomForOthersAndForSmallAnswers) {
+    host::AnswerBudget budget(4 * kMebibyte);
+    AnswerCharge small(budget, "a");
+    std::optional<AnswerCharge> large(std::in_place, budget, "a");
+    large->set(3 * kMebibyte);
+    EXPECT_THROW(AnswerCharge(budget, "a").add(100000), OverBudget);
+    small.set(65536);
+    AnswerCharge other(budget, "b");
+    other.add(kMebibyte);
+    EXPECT_THROW(other.add(1), OverBudget);
+    // What moves on with its answer is given back at that one's end, and only then.
+    std::optional<AnswerCharge> moved(large->split(2 * kMebibyte));
+    large.reset();
+    EXPECT_THROW(AnswerCharge(budget, "a").add(2 * kMebibyte), OverBudget);
+    moved.reset();
+    AnswerCharge(budget, "a").add(3 * kMebibyte);
+    EXPECT_THROW(AnswerCharge(budget, "a").add(3 * kMebibyte + 1), core::CimError);
+}
+
+TEST(UserSlotsTest, MakeOnlyTheirOwnUserWait) {
+    host::UserSlots slots(2);
+    const host::HeldUserSlot first(slots, "a", 0ms);
+    std::optional<host::HeldUserSlot> second(std::in_place, slots, "a", 0ms);
+    EXPECT_TRUE(first && *second);
+    EXPECT_FALSE(host::HeldUserSlot(slots, "a", 0ms));
+    EXPECT_TRUE(host::HeldUserSlot(slots, "b", 0ms));
+    second.reset();
+    EXPECT_TRUE(host::HeldUserSlot(slots, "a", 0ms));
+}
+
+TEST(WantedPropertiesTest, FindAsFastAmongThousandsOfNames) {
+    const auto cost = [](std::size_t count) {
+        const core::PropertyFilter filter(std::vector<std::string>(count, "ElapsedTima"));
+        const std::clock_t start = std::clock();
+        const core::WantedProperties wanted(filter);
+        for (int i = 0; i < 20000; ++i)
+            EXPECT_FALSE(wanted.includes("ElapsedTime"));
+        return std::clock() - start;
+    };
+    EXPECT_LT(cost(20000), cost(20) * 50 + CLOCKS_PER_SEC / 10);
+    EXPECT_TRUE(core::WantedProperties({{"b", "ElapsedTime", "c"}}).includes("eLAPSEDtIME"));
+}
+
+core::InstanceValue job(const std::string& id, std::uint64_t state) {
+    return {core::CimPath("J.ID=\"" + id + "\""),
+            {{"JobState", core::CimValue::of(core::CimType::Uint16, state), false, {}}}};
+}
+
+TEST(EndedJobsTest, AreSurplusByNumberAndAge) {
+    auto now = std::chrono::steady_clock::now();
+    host::EndedJobs jobs({2, 10s});
+    std::vector<core::InstanceValue> all{job("1", 7), job("2", 4), job("3", 10)};
+    const auto surplus = [&] {
+        std::string text;
+        for (const auto& [path, rule] : jobs.look(all, now))
+            text += path.toString() + " " + rule + " ";
+        return text;
+    };
+    EXPECT_EQ(surplus(), "");
+    // The first to end goes first, wherever it stands; no state but the two ends makes a job go.
+    now += 1s;
+    for (const std::uint64_t state : {2U, 3U, 5U, 6U, 8U, 9U, 11U, 12U})
+        all.push_back(job("s" + std::to_string(state), state));
+    all[1] = job("2", 10);
+    EXPECT_EQ(surplus(), "J.ID=\"1\" jobs.keep ");
+    all.erase(all.begin());
+    now += 9s;
+    EXPECT_EQ(surplus(), "J.ID=\"3\" jobs.keep_seconds ");
+    now += 1h;
+    EXPECT_EQ(surplus(), "J.ID=\"3\" jobs.keep_seconds J.ID=\"2\" jobs.keep_seconds ");
+    EXPECT_TRUE(host::EndedJobs({}).look(all, now).empty());
+}
+
+}  // namespace
