@@ -6,22 +6,27 @@
 #include <unistd.h>
 
 #include <array>
+#include <atomic>
 #include <cstdlib>
+#include <functional>
 #include <thread>
 
 #include "Cli/Connection/Connection.h"
 
 namespace {
 
+using ::testing::HasSubstr;
 using ::testing::StrEq;
 using ::testing::ThrowsMessage;
 
-/// Answers one request on loopback, whatever it asks.
-class OneAnswer {
+/// Answers requests on loopback, one on each connection, as it is told.
+class LoopbackServer {
   public:
-    explicit OneAnswer(const std::string& response)
-        : m_answer("<CIM CIMVERSION='2.0' DTDVERSION='2.0'>" + response + "</CIM>"),
-          m_socket(::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0)) {
+    /// Sends what it likes to the client's socket.
+    using Answer = std::function<void(int client, const std::string& request)>;
+
+    explicit LoopbackServer(Answer answer)
+        : m_answer(std::move(answer)), m_socket(::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0)) {
         sockaddr_in address{};
         address.sin_family = AF_INET;
         address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
@@ -31,14 +36,26 @@ class OneAnswer {
         EXPECT_EQ(::listen(m_socket, 1), 0);
         EXPECT_EQ(::getsockname(m_socket, generic, &size), 0);
         m_port = ntohs(address.sin_port);
-        m_thread = std::thread([this] { answer(); });
+        m_thread = std::thread([this] { serve(); });
     }
-    OneAnswer(const OneAnswer&) = delete;
-    OneAnswer& operator=(const OneAnswer&) = delete;
-    ~OneAnswer() {
+    /// Answers with this response, whatever is asked.
+    explicit LoopbackServer(const std::string& response)
+        : LoopbackServer([response](int client, const std::string&) { sendResponse(client, response); }) {}
+    LoopbackServer(const LoopbackServer&) = delete;
+    LoopbackServer& operator=(const LoopbackServer&) = delete;
+    ~LoopbackServer() {
         ::shutdown(m_socket, SHUT_RDWR);
         m_thread.join();
         ::close(m_socket);
+    }
+
+    static bool sendBytes(int client, const std::string& bytes) {
+        return ::send(client, bytes.data(), bytes.size(), MSG_NOSIGNAL) == static_cast<ssize_t>(bytes.size());
+    }
+    static void sendResponse(int client, const std::string& response) {
+        const std::string body = "<CIM CIMVERSION='2.0' DTDVERSION='2.0'>" + response + "</CIM>";
+        EXPECT_TRUE(sendBytes(client, "HTTP/1.1 200 OK\r\nConnection: close\r\nContent-Length: " +
+                                          std::to_string(body.size()) + "\r\n\r\n" + body));
     }
 
     cli::Connection connect() const {
@@ -50,24 +67,20 @@ class OneAnswer {
     }
 
   private:
-    void answer() const {
-        const int client = ::accept(m_socket, nullptr, nullptr);
-        std::string request;
-        std::array<char, 4096> bytes{};
-        while (request.find("</CIM>") == std::string::npos) {
-            const ssize_t length = ::recv(client, bytes.data(), bytes.size(), 0);
-            if (length <= 0) break;
-            request.append(bytes.data(), static_cast<std::size_t>(length));
+    void serve() const {
+        for (int client = 0; (client = ::accept(m_socket, nullptr, nullptr)) >= 0; ::close(client)) {
+            std::string request;
+            std::array<char, 4096> bytes{};
+            while (request.find("</CIM>") == std::string::npos) {
+                const ssize_t length = ::recv(client, bytes.data(), bytes.size(), 0);
+                if (length <= 0) break;
+                request.append(bytes.data(), static_cast<std::size_t>(length));
+            }
+            m_answer(client, request);
         }
-        const std::string reply =
-            "HTTP/1.1 200 OK\r\nConnection: close\r\nContent-Length: " + std::to_string(m_answer.size()) +
-            "\r\n\r\n" + m_answer;
-        EXPECT_EQ(::send(client, reply.data(), reply.size(), MSG_NOSIGNAL),
-                  static_cast<ssize_t>(reply.size()));
-        ::close(client);
     }
 
-    const std::string m_answer;
+    const Answer m_answer;
     const int m_socket;
     int m_port = 0;
     std::thread m_thread;
@@ -81,7 +94,7 @@ TEST(RemoteConnectionTest, TakesNoAnswerForAnotherRequestsOrForNothing) {
     const std::string returned = "<RETURNVALUE><VALUE>0</VALUE></RETURNVALUE></METHODRESPONSE>";
     const char* const other = "The server's answer belongs to another request.";
     const auto call = [](const std::string& response) {
-        OneAnswer(response).connect().operations->invokeMethod(core::CimPath("Y.Name=\"1\""), "X", {});
+        LoopbackServer(response).connect().operations->invokeMethod(core::CimPath("Y.Name=\"1\""), "X", {});
     };
     call(message("1", "<METHODRESPONSE NAME='x'>" + returned));
     const std::pair<std::string, const char*> table[] = {
@@ -92,7 +105,7 @@ TEST(RemoteConnectionTest, TakesNoAnswerForAnotherRequestsOrForNothing) {
          "The server's answer cannot be read: element METHODRESPONSE has no RETURNVALUE."}};
     for (const auto& row : table)
         EXPECT_THAT([&] { call(row.first); }, ThrowsMessage<cli::NoAnswer>(StrEq(row.second)));
-    const OneAnswer server(message("1", "<METHODRESPONSE NAME='EnumerateInstanceNames'>" + returned));
+    const LoopbackServer server(message("1", "<METHODRESPONSE NAME='EnumerateInstanceNames'>" + returned));
     EXPECT_THROW(server.connect().operations->enumerateInstanceNames("Y"), cli::NoAnswer);
 }
 
@@ -102,8 +115,8 @@ std::string classBelow(const std::string& name, const std::string& superclass) {
 
 TEST(RemoteConnectionTest, BuildsNoEndlessChainsOfClasses) {
     const auto read = [](const std::string& classes) {
-        const OneAnswer server(message("1", "<IMETHODRESPONSE NAME='EnumerateClasses'><IRETURNVALUE>" +
-                                                classes + "</IRETURNVALUE></IMETHODRESPONSE>"));
+        const LoopbackServer server(message("1", "<IMETHODRESPONSE NAME='EnumerateClasses'><IRETURNVALUE>" +
+                                                     classes + "</IRETURNVALUE></IMETHODRESPONSE>"));
         server.connect().operations->enumerateClasses("", true);
     };
     read(classBelow("A", "B") + classBelow("B", "Elsewhere"));
@@ -116,6 +129,56 @@ TEST(RemoteConnectionTest, BuildsNoEndlessChainsOfClasses) {
         {line, "class C0 has too many superclasses"}};
     for (const auto& row : table)
         EXPECT_THAT([&] { read(row.first); }, ThrowsMessage<core::CimError>(StrEq(row.second)));
+}
+
+TEST(RemoteConnectionTest, GivesUpAnswersWithoutEnd) {
+    const std::string piece(std::size_t{1} << 20, ' ');
+    std::atomic<int> sent{0};
+    for (const std::string head : {"", "Content-Length: 10737418240\r\n"}) {
+        const LoopbackServer server([&](int client, const std::string&) {
+            LoopbackServer::sendBytes(client, "HTTP/1.1 200 OK\r\nConnection: close\r\n" + head + "\r\n");
+            while (LoopbackServer::sendBytes(client, piece))
+                ++sent;
+        });
+        EXPECT_THAT(
+            [&] { server.connect().operations->getInstance(core::CimPath("Y.Name=\"1\"")); },
+            ThrowsMessage<cli::NoAnswer>(HasSubstr(" is larger than 64 MiB and was not read to its end.")));
+    }
+    EXPECT_LT(sent, 128);
+    // Nor does a list come to an end because its pieces are small.
+    const LoopbackServer server([](int client, const std::string& request) {
+        const auto valueOf = [&](const std::string& name) {
+            const std::size_t start = request.find(name + "=\"") + name.size() + 2;
+            return request.substr(start, request.find('"', start) - start);
+        };
+        LoopbackServer::sendResponse(
+            client, message(valueOf("MESSAGE ID"),
+                            "<IMETHODRESPONSE NAME='" + valueOf("IMETHODCALL NAME") +
+                                "'><IRETURNVALUE></IRETURNVALUE><PARAMVALUE NAME='EndOfSequence' "
+                                "PARAMTYPE='boolean'><VALUE>FALSE</VALUE></PARAMVALUE><PARAMVALUE "
+                                "NAME='EnumerationContext' PARAMTYPE='string'><VALUE>x</VALUE></PARAMVALUE>"
+                                "</IMETHODRESPONSE>"));
+    });
+    EXPECT_THAT([&] { server.connect().operations->enumerateInstanceNames("Y"); },
+                ThrowsMessage<cli::NoAnswer>(HasSubstr(" is larger than 256 MiB ")));
+}
+
+TEST(RemoteConnectionTest, ReadsAListWholeFromAServerWithoutPieces) {
+    int requests = 0;
+    const LoopbackServer server([&](int client, const std::string& request) {
+        const std::string id = std::to_string(++requests);
+        const bool isWhole = request.find("\"EnumerateInstanceNames\"") != std::string::npos;
+        LoopbackServer::sendResponse(
+            client,
+            message(id, isWhole ? "<IMETHODRESPONSE NAME='EnumerateInstanceNames'><IRETURNVALUE>"
+                                  "<INSTANCENAME CLASSNAME='Y'/></IRETURNVALUE></IMETHODRESPONSE>"
+                                : "<IMETHODRESPONSE NAME='OpenEnumerateInstancePaths'><ERROR CODE='7'/>"
+                                  "</IMETHODRESPONSE>"));
+    });
+    const cli::Connection connection = server.connect();
+    EXPECT_EQ(connection.operations->enumerateInstanceNames("Y").size(), 1U);
+    EXPECT_EQ(connection.operations->enumerateInstanceNames("Y").size(), 1U);
+    EXPECT_EQ(requests, 3);  // it does not ask again
 }
 
 }  // namespace

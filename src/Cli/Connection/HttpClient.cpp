@@ -39,11 +39,11 @@ bool isLoopbackHost(const std::string& host) {
 }
 
 std::size_t takeBody(char* data, std::size_t, std::size_t count, void* to) {
-    constexpr std::size_t kLargest = std::size_t{256} << 20;
-    auto& body = static_cast<HttpReply*>(to)->body;
-    // Anything but the count ends the transfer: a broken server must not fill the memory.
-    if (count > kLargest - body.size()) return 0;
-    body.append(data, count);
+    auto& reply = *static_cast<HttpReply*>(to);
+    // Anything but the count ends the transfer.
+    reply.isTooLarge = count > kLargestAnswer - reply.body.size();
+    if (reply.isTooLarge) return 0;
+    reply.body.append(data, count);
     return count;
 }
 
@@ -91,6 +91,14 @@ std::string adviceFor(CURLcode code, bool isEncrypted) {
 std::string localSocket() {
     const char* chosen = std::getenv("QUENXCTL_SOCKET");
     return chosen == nullptr || *chosen == '\0' ? cimxml::kDefaultSocket : chosen;
+}
+
+void refuseLargeAnswer(const std::string& url, std::size_t limit) {
+    throw NoAnswer(
+        ExitStatus::Failed,
+        "The answer of " + url + " is larger than " + std::to_string(limit >> 20) +
+            " MiB and was not read to its end.",
+        "Ask for less, such as a class further down, or check that --server names a CIM-XML server.");
 }
 
 ServerUrl::ServerUrl(const std::string& text) {
@@ -144,6 +152,7 @@ HttpClient::HttpClient(const ServerSettings& settings, const std::string& user, 
     set(CURLOPT_CONNECTTIMEOUT, kConnectSeconds);
     set(CURLOPT_TIMEOUT, kAnswerSeconds);
     set(CURLOPT_WRITEFUNCTION, &takeBody);
+    set(CURLOPT_MAXFILESIZE_LARGE, static_cast<curl_off_t>(kLargestAnswer));
     set(CURLOPT_HEADERFUNCTION, &takeHeader);
     set(CURLOPT_NOPROGRESS, 0L);
     set(CURLOPT_XFERINFODATA, &m_isInterrupted);
@@ -176,12 +185,12 @@ HttpReply HttpClient::post(const std::vector<std::string>& headers, const std::s
     set(CURLOPT_HEADERDATA, &reply);
     m_error.front() = '\0';  // the library does not clear what an earlier failure left
     const CURLcode code = curl_easy_perform(m_curl.get());
-    if (code != CURLE_OK) refuse(code);
+    if (code != CURLE_OK) refuse(code, reply.isTooLarge || code == CURLE_FILESIZE_EXCEEDED);
     curl_easy_getinfo(m_curl.get(), CURLINFO_RESPONSE_CODE, &reply.status);
     return reply;
 }
 
-void HttpClient::refuse(CURLcode code) const {
+void HttpClient::refuse(CURLcode code, bool isTooLarge) const {
     // Without --cacert it is the system that has no certificates, so the user did not name a bad file.
     if (code == CURLE_SSL_CACERT_BADFILE && !m_namesCaFile) code = CURLE_PEER_FAILED_VERIFICATION;
     long sent = 0;
@@ -191,6 +200,7 @@ void HttpClient::refuse(CURLcode code) const {
         if (sent > 0) throw NoAnswer(ExitStatus::Interrupted, what, "");
         throw CommandError(ExitStatus::Interrupted, what, "");
     }
+    if (isTooLarge) refuseLargeAnswer(m_url, kLargestAnswer);
     const std::string reason = m_error.front() == '\0' ? curl_easy_strerror(code) : m_error.data();
     const std::string what = "The request to " + m_url + " failed: " + reason + ".";
     const std::string advice = m_isLocal ? "Check that quenx-cimd runs, and listens there (listen.socket)."

@@ -13,12 +13,19 @@
 
 namespace cli {
 
+/// The largest answer that is taken: a broken or hostile server must not fill the memory.
+inline constexpr std::size_t kLargestAnswer = std::size_t{64} << 20;
+
 struct HttpReply {
     long status = 0;
     std::string body;
-    std::string cimError;    ///< the header of that name
-    std::string retryAfter;  ///< likewise, in seconds
+    bool isTooLarge = false;  ///< the rest was not read
+    std::string cimError;     ///< the header of that name
+    std::string retryAfter;   ///< likewise, in seconds
 };
+
+/// Throws NoAnswer that says so.
+[[noreturn]] void refuseLargeAnswer(const std::string& url, std::size_t limit);
 
 /// Requests to one server over one connection. Used from one thread.
 class HttpClient {
@@ -37,7 +44,7 @@ class HttpClient {
     void set(CURLoption option, T value) {
         curl_easy_setopt(m_curl.get(), option, value);
     }
-    [[noreturn]] void refuse(CURLcode code) const;
+    [[noreturn]] void refuse(CURLcode code, bool isTooLarge) const;
 
     std::unique_ptr<CURL, decltype(&curl_easy_cleanup)> m_curl;
     std::array<char, CURL_ERROR_SIZE> m_error{};

@@ -6,6 +6,7 @@
 #include <cerrno>
 #include <cstdlib>
 #include <iostream>
+#include <iterator>
 #include <utility>
 
 #include "CimXml/Request.h"
@@ -89,40 +90,73 @@ void requireOk(const HttpReply& reply) {
     throw NoAnswer(ExitStatus::Failed, why, "Check that --server names a CIM-XML server.");
 }
 
+/// The most that a list in pieces may hold, and what a piece counts at least: a server could go on for ever
+/// with empty ones.
+constexpr std::size_t kLargestList = std::size_t{256} << 20;
+constexpr std::size_t kLeastPiece = std::size_t{256} << 10;
+
+/// An operation whose answer may be large: whole, and its form in pieces (DSP0200 5.4.2.24).
+struct Listing {
+    const char* whole;
+    const char* open;
+    const char* pull;
+    bool hasLocalOnly = false;  ///< whole it leaves inherited properties out, unless told not to
+};
+constexpr Listing kInstances{"EnumerateInstances", "OpenEnumerateInstances", "PullInstancesWithPath", true};
+constexpr Listing kNames{"EnumerateInstanceNames", "OpenEnumerateInstancePaths", "PullInstancePaths"};
+constexpr Listing kAssociators{"Associators", "OpenAssociatorInstances", "PullInstancesWithPath"};
+constexpr Listing kAssociatorNames{"AssociatorNames", "OpenAssociatorInstancePaths", "PullInstancePaths"};
+constexpr Listing kReferences{"References", "OpenReferenceInstances", "PullInstancesWithPath"};
+constexpr Listing kReferenceNames{"ReferenceNames", "OpenReferenceInstancePaths", "PullInstancePaths"};
+
+/// Whether an error says that the server cannot give this list in pieces.
+bool mustBeWhole(core::CimStatus status) {
+    return status == core::CimStatus::NotSupported || status == core::CimStatus::MethodNotFound ||
+           status == core::CimStatus::ServerLimitsExceeded;
+}
+
+/// The output as a text; empty where there is none.
+std::string outputOf(const IntrinsicResult& result, std::string_view name) {
+    const core::Argument* output = core::findByName(result.outputs, name);
+    const core::CimScalar* value = output == nullptr ? nullptr : output->value.scalar();
+    return value == nullptr ? "" : core::scalarText(*value);
+}
+
 /// What a server answers over CIM-XML.
 class RemoteOperations : public core::CimOperations {
   public:
     RemoteOperations(const ServerSettings& settings, const std::string& user, const std::string& password,
                      std::function<bool()> isInterrupted)
-        : m_client(settings, user, password, std::move(isInterrupted)), m_namespace(settings.namespaceName) {}
+        : m_client(settings, user, password, std::move(isInterrupted)),
+          m_namespace(settings.namespaceName),
+          m_url(settings.url->text()) {}
 
     const std::string& getNamespace() const override { return m_namespace; }
 
     std::vector<core::InstanceValue> enumerateInstances(const std::string& className,
                                                         const core::PropertyFilter& filter) override {
-        return call("EnumerateInstances", withFilter({{"ClassName", ClassName{className}}, kWhole}, filter))
-            .instances;
+        return list(kInstances, withFilter({{"ClassName", ClassName{className}}}, filter)).instances;
     }
     std::vector<core::CimPath> enumerateInstanceNames(const std::string& className) override {
-        return call("EnumerateInstanceNames", {{"ClassName", ClassName{className}}}).paths;
+        return list(kNames, {{"ClassName", ClassName{className}}}).paths;
     }
     core::InstanceValue getInstance(const core::CimPath& path, const core::PropertyFilter& filter) override;
 
     std::vector<core::InstanceValue> associators(const core::CimPath& path, const core::AssociationFilter& by,
                                                  const core::PropertyFilter& filter) override {
-        return call("Associators", withFilter(associatorParameters(path, by), filter)).instances;
+        return list(kAssociators, withFilter(associatorParameters(path, by), filter)).instances;
     }
     std::vector<core::CimPath> associatorNames(const core::CimPath& path,
                                                const core::AssociationFilter& by) override {
-        return call("AssociatorNames", associatorParameters(path, by)).paths;
+        return list(kAssociatorNames, associatorParameters(path, by)).paths;
     }
     std::vector<core::InstanceValue> references(const core::CimPath& path, const core::AssociationFilter& by,
                                                 const core::PropertyFilter& filter) override {
-        return call("References", withFilter(referenceParameters(path, by), filter)).instances;
+        return list(kReferences, withFilter(referenceParameters(path, by), filter)).instances;
     }
     std::vector<core::CimPath> referenceNames(const core::CimPath& path,
                                               const core::AssociationFilter& by) override {
-        return call("ReferenceNames", referenceParameters(path, by)).paths;
+        return list(kReferenceNames, referenceParameters(path, by)).paths;
     }
 
     core::MethodResult invokeMethod(const core::CimPath& path, const std::string& method,
@@ -138,6 +172,9 @@ class RemoteOperations : public core::CimOperations {
     static inline const cimxml::Parameter kWhole{"LocalOnly", std::string("FALSE")};
 
     IntrinsicResult call(const std::string& operation, Parameters parameters);
+    /// The whole list, read in pieces where the server can.
+    IntrinsicResult list(const Listing& listing, const Parameters& parameters);
+    IntrinsicResult pullAll(const Listing& listing, Parameters parameters);
     std::vector<core::ClassChain> allClasses();
     /// Some operations answer with host and namespace, some with neither: all paths read as those in process.
     void complete(core::CimPath& path) const;
@@ -146,7 +183,10 @@ class RemoteOperations : public core::CimOperations {
 
     HttpClient m_client;
     std::string m_namespace;
+    std::string m_url;
     unsigned m_messages = 0;
+    std::size_t m_received = 0;  ///< bytes of answers to the operation under way
+    bool m_canPull = true;       ///< until the server says otherwise
 };
 
 cimxml::Response RemoteOperations::send(cimxml::Request request, const std::string& object) {
@@ -159,6 +199,7 @@ cimxml::Response RemoteOperations::send(cimxml::Request request, const std::stri
          "CIMObject: " + percentEncoded(object)},
         cimxml::writeRequest(request));
     requireOk(reply);
+    m_received += std::max(reply.body.size(), kLeastPiece);
     try {
         cimxml::Response response = cimxml::readResponse(reply.body);
         if (response.messageId != request.messageId || !core::sameName(response.name, request.name()))
@@ -182,6 +223,44 @@ IntrinsicResult RemoteOperations::call(const std::string& operation, Parameters 
     for (core::CimPath& path : result->paths)
         complete(path);
     return std::move(*result);
+}
+
+IntrinsicResult RemoteOperations::list(const Listing& listing, const Parameters& parameters) {
+    const auto* source = std::get_if<core::CimPath>(&parameters.front().value);
+    // The associations of classes can only be had whole.
+    if (m_canPull && (source == nullptr || source->isInstancePath())) {
+        try {
+            return pullAll(listing, parameters);
+        } catch (const core::CimError& error) {
+            if (!mustBeWhole(error.status())) throw;
+            // Limits pass, but a server that knows no such operation will not learn it.
+            m_canPull = error.status() == core::CimStatus::ServerLimitsExceeded;
+        }
+    }
+    Parameters whole = parameters;
+    if (listing.hasLocalOnly) whole.push_back(kWhole);
+    return call(listing.whole, whole);
+}
+
+IntrinsicResult RemoteOperations::pullAll(const Listing& listing, Parameters parameters) {
+    // With few enough objects in each that any class's fit into what a reader takes of one answer.
+    const cimxml::Parameter count{"MaxObjectCount", std::string("250")};
+    // As the operations that open an enumeration call it.
+    for (cimxml::Parameter& parameter : parameters)
+        if (parameter.name == "ObjectName") parameter.name = "InstanceName";
+    parameters.push_back(count);
+    m_received = 0;
+    IntrinsicResult all = call(listing.open, std::move(parameters));
+    IntrinsicResult part{.outputs = all.outputs};
+    while (!core::sameName(outputOf(part, "EndOfSequence"), "TRUE")) {
+        const std::string context = outputOf(part, "EnumerationContext");
+        if (context.empty()) refuseAnswer("The server's answer has neither an end nor a way to go on.");
+        if (m_received > kLargestList) refuseLargeAnswer(m_url, kLargestList);
+        part = call(listing.pull, {{"EnumerationContext", context}, count});
+        std::move(part.instances.begin(), part.instances.end(), std::back_inserter(all.instances));
+        std::move(part.paths.begin(), part.paths.end(), std::back_inserter(all.paths));
+    }
+    return all;
 }
 
 void RemoteOperations::complete(core::CimPath& path) const {

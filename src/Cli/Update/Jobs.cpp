@@ -3,6 +3,7 @@
 
 #include <algorithm>
 #include <array>
+#include <unordered_map>
 
 #include "Cli/Display/Messages.h"
 #include "Cli/Display/Output.h"
@@ -17,20 +18,30 @@ const core::CimPath* endOf(const core::CimPath& association, std::string_view ro
     return key == nullptr ? nullptr : std::get_if<core::CimPath>(&key->value);
 }
 
+/// The same for every spelling of a path in the answers of one server, which may leave out host and
+/// namespace.
+std::string keyOf(const core::CimPath& path) {
+    return core::CimPath(core::foldName(path.getClassName()), path.getKeys()).toString();
+}
+
 /// A job does not tell its adapter; an association does.
 void nameAdapters(core::CimOperations& operations, std::vector<JobView>& jobs) {
+    // By key, since a server may have thousands of jobs and more associations than that.
+    std::unordered_map<std::string, JobView*> byPath;
+    for (JobView& job : jobs)
+        byPath.emplace(keyOf(job.path), &job);
+    std::unordered_map<std::string, std::string> portNames;
+    for (const core::InstanceValue& port : operations.enumerateInstances("Quenx_EthernetPort"))
+        portNames.emplace(keyOf(port.path), port.text("Name"));
     // Three enumerations in all: asking for the associators of each job would be a request for each.
-    const auto ports = operations.enumerateInstances("Quenx_EthernetPort");
     for (const core::CimPath& affected : operations.enumerateInstanceNames("Quenx_AffectedJobElement")) {
         const core::CimPath* element = endOf(affected, "AffectedElement");
         const core::CimPath* affecting = endOf(affected, "AffectingElement");
         if (element == nullptr || affecting == nullptr) continue;
-        const auto port =
-            std::ranges::find_if(ports, [&](const auto& each) { return each.path.isSameObjectAs(*element); });
-        const auto job = std::ranges::find_if(
-            jobs, [&](const auto& each) { return each.path.isSameObjectAs(*affecting); });
+        const auto port = portNames.find(keyOf(*element));
+        const auto job = byPath.find(keyOf(*affecting));
         // A job affects the card of its port, too; only the port is an adapter.
-        if (port != ports.end() && job != jobs.end()) job->adapter = port->text("Name");
+        if (port != portNames.end() && job != byPath.end()) job->second->adapter = port->second;
     }
 }
 
@@ -104,10 +115,18 @@ void to_json(Json& json, const JobView& job) {
             {"errorDescription", job.errorDescription}};
 }
 
-std::vector<JobView> readJobs(core::CimOperations& operations) {
+std::vector<JobView> listJobs(core::CimOperations& operations) {
     std::vector<JobView> jobs;
-    for (const core::InstanceValue& job : operations.enumerateInstances("Quenx_ConcreteJob"))
+    // What viewOf() reads, and no more: of thousands of jobs the rest would be most of the answer.
+    const core::PropertyFilter shown{
+        {"InstanceID", "StartTime", "Owner", "JobState", "PercentComplete", "ErrorCode", "ErrorDescription"}};
+    for (const core::InstanceValue& job : operations.enumerateInstances("Quenx_ConcreteJob", shown))
         jobs.push_back(viewOf(job));
+    return jobs;
+}
+
+std::vector<JobView> readJobs(core::CimOperations& operations) {
+    std::vector<JobView> jobs = listJobs(operations);
     if (!jobs.empty()) nameAdapters(operations, jobs);
     return jobs;
 }

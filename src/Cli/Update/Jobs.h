@@ -38,7 +38,9 @@ struct JobView {
 };
 void to_json(nlohmann::ordered_json& json, const JobView& job);
 
-/// All jobs that the service knows, with their adapters.
+/// All jobs that the service knows, without their adapters.
+std::vector<JobView> listJobs(core::CimOperations& operations);
+/// The same with their adapters.
 std::vector<JobView> readJobs(core::CimOperations& operations);
 
 /// How a job is followed; tests put their own in.

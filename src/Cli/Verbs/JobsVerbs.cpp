@@ -12,8 +12,8 @@ namespace cli {
 namespace {
 
 /// Jobs end with the process that runs them, so only a server can have any that were started before.
-std::vector<JobView> jobsOfServer(const Connection& connection) {
-    if (!connection.isInProcess) return readJobs(*connection.operations);
+core::CimOperations& requireServer(const Connection& connection) {
+    if (!connection.isInProcess) return *connection.operations;
     throw CommandError(
         ExitStatus::WrongUse,
         "Jobs are kept by a server, and none was named: an update in this program ends with it.",
@@ -72,7 +72,7 @@ void printDeleted(Context& context, const JobView& job) {
 }  // namespace
 
 ExitStatus showJobs(Context& context, const VerbOptions&) {
-    const std::vector<JobView> jobs = jobsOfServer(context.connection);
+    const std::vector<JobView> jobs = readJobs(requireServer(context.connection));
     if (context.json) {
         printJson(context.out, {{"jobs", jobs}});
     } else if (jobs.empty()) {
@@ -84,10 +84,11 @@ ExitStatus showJobs(Context& context, const VerbOptions&) {
 }
 
 ExitStatus deleteJob(Context& context, const VerbOptions& options) {
-    for (const JobView& job : jobsOfServer(context.connection)) {
+    core::CimOperations& operations = requireServer(context.connection);
+    for (const JobView& job : listJobs(operations)) {
         if (!isMeant(job, options.job)) continue;
         // As it was before: afterwards nobody can ask whether it still ran.
-        context.connection.operations->deleteInstance(job.path);
+        operations.deleteInstance(job.path);
         printDeleted(context, job);
         return ExitStatus::Done;
     }

@@ -8,6 +8,7 @@
 #include <array>
 
 #include "CimXml/Response.h"
+#include "Framework/Requests/Audit.h"
 #include "Host/Authentication/Authentication.h"
 #include "Host/Authentication/ClientAddress.h"
 #include "Host/Operations/Dispatcher.h"
@@ -112,7 +113,10 @@ bool HttpRequest::isLocal() const {
 std::optional<HttpAnswer> HttpRequest::authenticate() {
     if (isLocal()) {
         const std::optional<User> user = localUserAt(m_socket);
-        if (!user) return HttpAnswer::plain(403);
+        if (!user) {
+            core::audit({"", m_head.address, "login", "", "denied: not root"});
+            return HttpAnswer::plain(403);
+        }
         m_user = *user;
     } else {
         // While we wait for a turn or check a password, the client is not the slow one.
