@@ -28,7 +28,8 @@ class RawConnection {
         const timeval patience{60, 0};
         ::setsockopt(m_socket, SOL_SOCKET, SO_RCVTIMEO, &patience, sizeof patience);
         if (buffer != 0) {
-            // Both: with the large packets of loopback the other side would take megabytes into its own buffer.
+            // Both: with the large packets of loopback the other side would take megabytes into its own
+            // buffer.
             const int packet = 536;
             ::setsockopt(m_socket, SOL_SOCKET, SO_RCVBUF, &buffer, sizeof buffer);
             ::setsockopt(m_socket, IPPROTO_TCP, TCP_MAXSEG, &packet, sizeof packet);

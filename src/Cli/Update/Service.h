@@ -9,9 +9,9 @@
 #include "Cli/Update/Candidate.h"
 #include "Cli/Update/Jobs.h"
 
-/// The calls of the one software installation service, which throw CommandError when none is served, and leave
-/// an audit line in process; and what its codes do not say: what is wrong with this image or adapter, and what
-/// to do about it.
+/// The calls of the one software installation service, which throw CommandError when none is served, and
+/// leave an audit line in process; and what its codes do not say: what is wrong with this image or adapter,
+/// and what to do about it.
 namespace cli {
 
 /// Calls InstallFromURI, or InstallFromSoftwareIdentity for an image of the inventory; the identity itself
