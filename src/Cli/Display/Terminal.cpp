@@ -24,11 +24,12 @@ bool isSet(const char* variable) {
 /// Controls, U+0080 to U+009F among them, move the cursor and more; bidirectional overrides and isolates
 /// (U+202A to U+202E, U+2066 to U+2069) make a text look like another.
 bool drivesTerminal(std::string_view character) {
-    const auto isWithin = [&](std::string_view first, std::string_view last) {
-        return character >= first && character <= last;
+    const auto isWithin = [&](std::string_view lead, char first, char last) {
+        return character.size() == lead.size() + 1 && character.starts_with(lead) &&
+               character.back() >= first && character.back() <= last;
     };
-    return utils::isControl(character.front()) || isWithin("\xC2\x80", "\xC2\x9F") ||
-           isWithin("\xE2\x80\xAA", "\xE2\x80\xAE") || isWithin("\xE2\x81\xA6", "\xE2\x81\xA9");
+    return utils::isControl(character.front()) || isWithin("\xC2", '\x80', '\x9F') ||
+           isWithin("\xE2\x80", '\xAA', '\xAE') || isWithin("\xE2\x81", '\xA6', '\xA9');
 }
 
 /// Whether the byte belongs to the character before it.

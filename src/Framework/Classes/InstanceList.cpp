@@ -210,7 +210,7 @@ InstanceList::InstanceList() : m_link(std::make_shared<Link>(this)) {
 InstanceList::~InstanceList() {
     // First, so that no instance reaches a list that is half gone.
     m_link->close();
-    clear();
+    InstanceList::clear();
     setElementOwner(nullptr);
 }
 

@@ -2,11 +2,9 @@
 #include "Framework/Model/CimValue.h"
 
 #include <algorithm>
-#include <array>
 #include <charconv>
 #include <chrono>
 #include <cmath>
-#include <cstdio>
 #include <utility>
 
 #include "Utils/Utils.h"
@@ -202,15 +200,12 @@ std::string datetimeText(utils::Time time) {
     int second = 0;
     time.get(year, month, day, hour, minute, second);
     const int milliseconds = static_cast<int>(time.getMiliseconds() % 1000);
-    std::array<char, 80> text{};
-    if (time.isPeriod()) {
-        std::snprintf(text.data(), text.size(), "%08d%02d%02d%02d.%03d000:000", std::min(day, kMaxDays), hour,
-                      minute, second, milliseconds);
-    } else {
-        std::snprintf(text.data(), text.size(), "%04d%02d%02d%02d%02d%02d.%03d000+000", std::min(year, 9999),
-                      month, day, hour, minute, second, milliseconds);
-    }
-    return {text.data(), std::min(kDatetimeLength, std::char_traits<char>::length(text.data()))};
+    const std::string text =
+        time.isPeriod() ? utils::formatStr("%08d%02d%02d%02d.%03d000:000", std::min(day, kMaxDays), hour,
+                                           minute, second, milliseconds)
+                        : utils::formatStr("%04d%02d%02d%02d%02d%02d.%03d000+000", std::min(year, 9999),
+                                           month, day, hour, minute, second, milliseconds);
+    return text.substr(0, kDatetimeLength);
 }
 
 std::optional<utils::Time> parseDatetime(std::string_view text) {

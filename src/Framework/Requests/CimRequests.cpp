@@ -194,6 +194,7 @@ std::vector<ClassChain> CimRequests::enumerateClasses(const std::string& classNa
         }
     }
     std::vector<ClassChain> result;
+    result.reserve(found.size());
     for (auto& [name, chain] : found)
         result.push_back(std::move(chain));
     return result;

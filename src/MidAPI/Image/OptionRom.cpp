@@ -4,7 +4,6 @@
 #include <algorithm>
 #include <array>
 #include <cinttypes>
-#include <cstdio>
 
 #include "MidAPI/Image/RomFormat.h"
 #include "Utils/Utils.h"
@@ -25,11 +24,8 @@ struct Flaw {
 using MaybeFlaw = std::optional<Flaw>;
 
 std::string describe(std::size_t imageNumber, std::size_t imageOffset, const Flaw& flaw) {
-    char where[96];
-    std::snprintf(where, sizeof where, "image %zu at 0x%zx: ", imageNumber + 1, imageOffset);
-    char at[48];
-    std::snprintf(at, sizeof at, " (offset 0x%zx)", imageOffset + flaw.offset);
-    return where + flaw.what + at;
+    return utils::formatStr("image %zu at 0x%zx: ", imageNumber + 1, imageOffset) + flaw.what +
+           utils::formatStr(" (offset 0x%zx)", imageOffset + flaw.offset);
 }
 
 /// The NUL-terminated text at an offset of the image; empty when there is none.
@@ -219,9 +215,7 @@ std::span<const std::uint8_t> imageBytes(std::span<const std::uint8_t> file, con
 }
 
 std::string formatIds(std::uint16_t vendor, std::uint16_t device) {
-    char text[10];
-    std::snprintf(text, sizeof text, "%04" PRIx16 ":%04" PRIx16, vendor, device);
-    return text;
+    return utils::formatStr("%04" PRIx16 ":%04" PRIx16, vendor, device);
 }
 
 std::string_view firmwareTypeName(utils::FirmwareType type) {

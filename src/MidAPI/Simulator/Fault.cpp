@@ -20,7 +20,7 @@ void strike(const Fault& fault) {
             // Nothing on the way out repairs files, so an exception leaves them as a power cut would.
             throw AdapterError(fault.text);
         case Fault::Action::Kill:
-            std::raise(SIGKILL);
+            static_cast<void>(std::raise(SIGKILL));
             break;
         case Fault::Action::Stall:
             std::this_thread::sleep_for(std::chrono::milliseconds(fault.milliseconds));
