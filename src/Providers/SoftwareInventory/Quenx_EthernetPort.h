@@ -8,7 +8,7 @@
 #include "Providers/SoftwareInventory/Devices.h"
 
 /// One port (one PCI function) of an Ethernet adapter.
-class Quenx_EthernetPort : public CIM_EthernetPort, public inventory::EthernetPort {
+class Quenx_EthernetPort final : public CIM_EthernetPort, public inventory::EthernetPort {
   public:
     static constexpr core::CimClassInfo classInfo{"Quenx_EthernetPort", &CIM_EthernetPort::classInfo};
 

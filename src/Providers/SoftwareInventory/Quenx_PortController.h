@@ -21,7 +21,7 @@ std::vector<Card> groupByCard(const std::vector<Port>& ports);
 }  // namespace inventory
 
 /// One card with the ports that are its PCI functions.
-class Quenx_PortController : public CIM_PortController, public inventory::PortController {
+class Quenx_PortController final : public CIM_PortController, public inventory::PortController {
   public:
     static constexpr core::CimClassInfo classInfo{"Quenx_PortController", &CIM_PortController::classInfo};
 

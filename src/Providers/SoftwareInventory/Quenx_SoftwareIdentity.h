@@ -10,7 +10,7 @@
 ///
 /// The only version of the image format is a 16-bit code revision for each image. MajorVersion is the highest
 /// of them; VersionString, and IdentityInfoValue beside IdentityInfoType "Quenx:IMG_...", have all.
-class Quenx_SoftwareIdentity : public CIM_SoftwareIdentity, public inventory::SoftwareIdentity {
+class Quenx_SoftwareIdentity final : public CIM_SoftwareIdentity, public inventory::SoftwareIdentity {
   public:
     static constexpr core::CimClassInfo classInfo{"Quenx_SoftwareIdentity", &CIM_SoftwareIdentity::classInfo};
 

@@ -7,8 +7,8 @@
 #include "Providers/SoftwareInventory/Firmware.h"
 
 /// A firmware file in one of the configured directories.
-class Quenx_SoftwareIdentityResource : public CIM_SoftwareIdentityResource,
-                                       public inventory::SoftwareIdentityResource {
+class Quenx_SoftwareIdentityResource final : public CIM_SoftwareIdentityResource,
+                                             public inventory::SoftwareIdentityResource {
   public:
     static constexpr core::CimClassInfo classInfo{"Quenx_SoftwareIdentityResource",
                                                   &CIM_SoftwareIdentityResource::classInfo};

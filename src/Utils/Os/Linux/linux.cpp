@@ -28,7 +28,7 @@ namespace os {
 namespace {
 
 std::atomic<unsigned int> forks{0};
-[[maybe_unused]] const int forkHandler = pthread_atfork(nullptr, nullptr, [] { ++forks; });
+[[maybe_unused]] const int kForkHandler = pthread_atfork(nullptr, nullptr, [] { ++forks; });
 
 struct CloseDirectory {
     void operator()(DIR* directory) const noexcept { closedir(directory); }
