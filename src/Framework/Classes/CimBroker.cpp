@@ -47,9 +47,8 @@ void CimAgent::leaveBroker() noexcept {
         return;
     }
     GetCimBroker()->removeAgent(this);
-    m_classes.clear();
     // A deleted job may still be flashing, and its code is the library's that is about to unload.
-    drainReaper();
+    drainReaper([this] { m_classes.clear(); });
 }
 
 CimBroker::~CimBroker() = default;

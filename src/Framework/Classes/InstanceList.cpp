@@ -64,6 +64,7 @@ class InstanceReaper {
     InstanceReaper& operator=(const InstanceReaper&) = delete;
 
     ~InstanceReaper() {
+        banThreads();
         drain();
         std::unique_lock lock(m_mutex);
         m_changed.wait(lock, [this] { return !m_isRunning; });
@@ -109,6 +110,15 @@ class InstanceReaper {
         startThread();
     }
 
+    void banThreads() noexcept {
+        const std::lock_guard lock(m_mutex);
+        ++m_bans;
+    }
+    void allowThreads() noexcept {
+        const std::lock_guard lock(m_mutex);
+        if (--m_bans == 0 && m_first != nullptr) startThread();
+    }
+
     void drain() noexcept {
         const utils::Thread::Waiting waiting;
         std::unique_lock lock(m_mutex);
@@ -121,9 +131,10 @@ class InstanceReaper {
   private:
     bool isOfThisProcess() const { return m_forks == os::forkCount(); }
 
-    /// Under the lock. False when the system refuses a thread.
+    /// Under the lock. False when the system refuses a thread, or one is not wanted.
     bool startThread() noexcept {
         if (isOfThisProcess() && m_isRunning) return true;
+        if (m_bans != 0) return false;
         forgetThread();
         if (!isOfThisProcess()) m_busy = 0;
         m_forks = os::forkCount();
@@ -180,6 +191,7 @@ class InstanceReaper {
     CimInstance* m_first = nullptr;
     CimInstance* m_last = nullptr;
     std::uint32_t m_busy = 0;  ///< how many are being destroyed
+    std::uint32_t m_bans = 0;  ///< how many want no thread
 };
 
 /// A list and its instances end in any order: an instance that a request still holds outlives its list, and
@@ -307,8 +319,12 @@ void prepareReaper() {
     InstanceReaper::theOne();
 }
 
-void drainReaper() noexcept {
-    InstanceReaper::theOne().drain();
+void drainReaper(const std::function<void()>& release) noexcept {
+    InstanceReaper& reaper = InstanceReaper::theOne();
+    reaper.banThreads();
+    release();
+    reaper.drain();
+    reaper.allowThreads();
 }
 
 bool isReaperBusy() noexcept {

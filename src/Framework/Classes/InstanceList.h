@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include <functional>
 #include <memory>
 #include <utility>
 #include <vector>
@@ -60,8 +61,11 @@ QUENX_EXPORT utils::SafeList<CimInstance*>::Iterator joinInstances(
 /// Makes sure that the reaper is built, and so destroyed after the object that is being built now.
 void prepareReaper();
 
-/// Returns when every instance that was queued is destroyed, code of its library included.
-QUENX_EXPORT void drainReaper() noexcept;
+/// Calls `release`, which lets go of instances and must not throw. Returns when every instance that was
+/// queued is destroyed, code of its library included. No thread is started for that: the caller may be the
+/// last thread of the process, which runs its end, and a further thread that ended then would run that end a
+/// second time.
+QUENX_EXPORT void drainReaper(const std::function<void()>& release) noexcept;
 
 /// Whether the thread still has instances to destroy.
 QUENX_EXPORT bool isReaperBusy() noexcept;
