@@ -76,7 +76,7 @@ void destroyOne() {
     core::InstanceList list;
     list.add(new Slow);
     list.clear();
-    core::drainReaper();
+    core::drainReaper([] {});
 }
 
 TEST_F(InstanceListTest, DestroysInstancesUntilTheProcessHasEnded) {
