@@ -48,7 +48,7 @@ void call(benchmark::State& state, Host& host, const char* method,
             if (output.name != "Job") continue;
             host.requests().deleteInstance(std::get<core::CimPath>(*output.value.scalar()));
         }
-        core::drainReaper();
+        core::drainReaper([] {});
         state.ResumeTiming();
     }
 }

@@ -193,7 +193,7 @@ TEST_F(FaultTableTest, WithoutAnyThreadNobodyWaits) {
     EXPECT_TRUE(m_requests.enumerateInstanceNames("Quenx_ConcreteJob").empty());
     // The destructor, which waits, is left to whoever has to wait anyway.
     EXPECT_FALSE(test::SyslogCapture::contains("Destroying JobThread"));
-    core::drainReaper();
+    core::drainReaper([] {});
     EXPECT_TRUE(test::SyslogCapture::contains("Destroying JobThread"));
     disarm();
 }

@@ -170,7 +170,7 @@ TEST_F(ConcreteJobTest, IsAllThatCanBeDeletedAndFlashesOn) {
     EXPECT_EQ(install(goodImage(), "eth1").returnValue, 2U);
     EXPECT_EQ(claim(), "eth0");
     m_backend->letGo();
-    core::drainReaper();
+    core::drainReaper([] {});
     EXPECT_EQ(claim(), "");
     EXPECT_EQ(test::componentsOf("eth0"), "IMG_PXE 2, IMG_UEFI 1");
 }
