@@ -38,8 +38,8 @@ QUENX_EXPORT std::string_view trimOf(std::string_view text, std::string_view cha
 /// leading zeros of a decimal number, anything after it. False, and `value` untouched, when refused.
 QUENX_EXPORT bool toUint(std::string_view text, std::uint32_t& value);
 
-/// Reads the whole text as a number, the way std::from_chars() does: no blanks, no prefix, and a sign only for
-/// a T that has one. Nothing for any other text, or one that T cannot hold.
+/// Reads the whole text as a number, the way std::from_chars() does: no blanks, no prefix, and a sign only
+/// for a T that has one. Nothing for any other text, or one that T cannot hold.
 template <class T, class... Format>
 std::optional<T> parseNumber(std::string_view text, Format... format) {
     T number{};

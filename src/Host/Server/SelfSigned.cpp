@@ -159,7 +159,8 @@ bool isCertificateToBeRenewed(const TlsSettings& settings) {
     const std::time_t until = ::gnutls_x509_crt_get_expiration_time(certificate.get());
     // Its very lifetime shows that it is one of ours, and not one that the administrator put there.
     // A time before 1970 cannot be read back.
-    return (from <= 0 || (from < kTooEarly && until - from == kLifetime + kDay)) && until < std::time(nullptr);
+    return (from <= 0 || (from < kTooEarly && until - from == kLifetime + kDay)) &&
+           until < std::time(nullptr);
 }
 
 bool areTlsFilesToBeMade(const TlsSettings& settings) {
