@@ -94,16 +94,7 @@ CimProperty::~CimProperty() {
 }
 
 std::string CimProperty::toString() {
-    const CimValue value = getValue();
-    if (const CimScalar* scalar = value.scalar()) return scalarText(*scalar);
-    std::string text;
-    if (const auto* elements = value.elements()) {
-        for (const CimScalar& element : *elements) {
-            if (!text.empty()) text += ',';
-            text += scalarText(element);
-        }
-    }
-    return text;
+    return valueText(getValue());
 }
 
 CimType CimProperty::getType() {

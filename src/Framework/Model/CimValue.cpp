@@ -159,6 +159,19 @@ std::string scalarText(const CimScalar& value) {
     return std::visit(Writer{}, value);
 }
 
+std::string valueText(const CimValue& value, std::size_t enough) {
+    if (const CimScalar* scalar = value.scalar()) return scalarText(*scalar);
+    std::string text;
+    if (const auto* elements = value.elements()) {
+        for (const CimScalar& element : *elements) {
+            if (text.size() > enough) break;
+            if (!text.empty()) text += ',';
+            text += scalarText(element);
+        }
+    }
+    return text;
+}
+
 std::optional<CimScalar> parseScalar(CimType type, std::string_view text) {
     const std::string_view bare = utils::trimOf(text, " \t\r\n");
     if (isUnsigned(type)) return parseInteger<std::uint64_t>(type, bare);

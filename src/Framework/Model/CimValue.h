@@ -125,6 +125,9 @@ struct QUENX_EXPORT CimValue {
 /// The value in its CIM text form: integers in decimal, booleans TRUE and FALSE, datetimes in 25 characters,
 /// references as object paths, strings as they are (not quoted).
 QUENX_EXPORT std::string scalarText(const CimScalar& value);
+/// The same of any value: elements of an array with commas between them, "5,3"; empty for null. Elements that
+/// begin after `enough` bytes are left out, since a client may send a megabyte of them.
+QUENX_EXPORT std::string valueText(const CimValue& value, std::size_t enough = std::string::npos);
 
 /// Reads a text as a value of the type. Integers in decimal or 0x..., within the range of the type; booleans
 /// in any case; blanks around numbers and booleans are ignored. Nothing for any other text.

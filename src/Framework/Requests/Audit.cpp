@@ -17,28 +17,14 @@ std::string field(const char* name, const std::string& value, std::size_t limit)
     return std::string(" ") + name + "=\"" + utils::escapeForLog(value, limit) + '"';
 }
 
-/// "5,3"; nothing for null.
-std::string valueText(const CimValue& value) {
-    if (const CimScalar* scalar = value.scalar()) return scalarText(*scalar);
-    std::string text;
-    if (const auto* elements = value.elements()) {
-        for (const CimScalar& element : *elements) {
-            if (!text.empty()) text += ',';
-            text += scalarText(element);
-            // A client may send a megabyte of them.
-            if (text.size() > kTextLimit) break;
-        }
-    }
-    return text;
-}
-
 /// "URI='file:///new.rom' InstallOptions='5'": a quote inside is escaped, so that no value can pose as two.
 std::string argumentsText(const std::vector<Argument>& arguments) {
     std::string text;
     for (const Argument& argument : arguments) {
         if (argument.value.isNull()) continue;
         const std::string next = utils::escapeForLog(argument.name, kNameLimit) + "='" +
-                                 utils::escapeForLog(valueText(argument.value), kTextLimit) + '\'';
+                                 utils::escapeForLog(valueText(argument.value, kTextLimit), kTextLimit) +
+                                 '\'';
         if (text.size() + next.size() > kArgumentsLimit) return text + " \\...";
         text += (text.empty() ? "" : " ") + next;
     }
@@ -51,7 +37,7 @@ std::string outcomeOf(const MethodResult& result) {
     std::string text = "returned " + std::to_string(result.returnValue);
     for (const Argument& output : result.outputs) {
         if (output.value.type == CimType::Reference)
-            text += ", " + output.name + "=" + valueText(output.value);
+            text += ", " + output.name + "=" + valueText(output.value, kTextLimit);
     }
     return text;
 }
