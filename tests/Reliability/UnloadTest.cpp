@@ -131,6 +131,15 @@ std::string outputOf(const std::vector<std::string>& words) {
     return text;
 }
 
+const std::string kAdapter = R"(
+    [[adapter]]
+    name = "eth0"
+    pci_address = "0000:03:00.0"
+    pci_id = "1af4:1041"
+    mac = "52:54:00:00:00:10"
+    components = [ { type = "IMG_PXE", revision = 1 }, { type = "IMG_UEFI", revision = 0 } ]
+    )";
+
 // dlclose holds the loader's lock while it waits for workers and requests. Whatever these do for the first
 // time in the process or on their thread must not need that lock: a backtrace, a thread-local variable, an
 // exception.
@@ -143,13 +152,7 @@ TEST(HostOfCTest, UnloadsEitherProviderFirstWhileFlashesFailAndRequestsAreRefuse
                                      std::pair(QUENX_UPDATE_LIBRARY, QUENX_INVENTORY_LIBRARY)}) {
         for (const std::string closedFirst : {"0", "1"}) {
             const bool isOne = closedFirst == "0";
-            folder.write("adapters.toml", R"(
-                [[adapter]]
-                name = "eth0"
-                pci_address = "0000:03:00.0"
-                pci_id = "1af4:1041"
-                mac = "52:54:00:00:00:10"
-                components = [ { type = "IMG_PXE", revision = 1 }, { type = "IMG_UEFI", revision = 0 } ]
+            folder.write("adapters.toml", kAdapter + R"(
                 [[adapter.fault]]
                 at = "write"
                 action = "stall"
@@ -158,7 +161,7 @@ TEST(HostOfCTest, UnloadsEitherProviderFirstWhileFlashesFailAndRequestsAreRefuse
                 at = "write"
                 percent = 50
                 text = "the device went away"
-                action = ")" + std::string(isOne ? "fail" : "throw") +
+                action = ")" + (isOne ? "fail" : "throw") +
                                               "\"\n");
             for (const std::string use : {"flash", "calls"}) {
                 EXPECT_EQ(outputOf({"env", "QUENX_ADAPTERS=" + folder / "adapters.toml",
@@ -175,13 +178,7 @@ TEST(HostOfCTest, UnloadsEitherProviderFirstWhileFlashesFailAndRequestsAreRefuse
 TEST(HostOfCTest, EndsWithItsLastThreadAndLetsAChildEndAtOnce) {
     if (__has_feature(thread_sanitizer)) GTEST_SKIP() << "the thread sanitizer has a thread that never ends";
     const test::TempFolder folder;
-    folder.write("adapters.toml", R"(
-        [[adapter]]
-        name = "eth0"
-        pci_address = "0000:03:00.0"
-        pci_id = "1af4:1041"
-        mac = "52:54:00:00:00:10"
-        components = [ { type = "IMG_PXE", revision = 1 }, { type = "IMG_UEFI", revision = 0 } ]
+    folder.write("adapters.toml", kAdapter + R"(
         [[adapter.fault]]
         at = "write"
         action = "stall"
