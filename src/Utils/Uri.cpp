@@ -57,15 +57,16 @@ bool Uri::IsUriSupported() const {
 }
 
 bool Uri::IsUriAccesible() const {
+    // Opened, not only looked at: a file that the service may not read is not accessible.
     os::Patience patience;
-    return IsUriAccesible(patience);
+    return IsUriSupported() &&
+           IsUriAccesible(os::lookAtFile(m_sourcePath, -1, patience).value_or(os::FileLook()));
 }
 
-bool Uri::IsUriAccesible(os::Patience& patience) const {
+bool Uri::IsUriAccesible(const os::FileLook& look) const {
     if (!IsUriSupported() || m_scheme != SupportedURISchemes::File) return false;
-    // Opened, not only looked at: a file that the service may not read is not accessible.
     try {
-        os::getFileSize(m_sourcePath, patience);
+        os::getFileSize(m_sourcePath, look);
         return true;
     } catch (...) {
         return false;

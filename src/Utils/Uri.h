@@ -7,7 +7,7 @@
 #include "Utils/Export.h"
 
 namespace os {
-struct Patience;
+struct FileLook;
 }
 
 namespace utils {
@@ -34,7 +34,8 @@ class QUENX_EXPORT Uri {
 
     /// True if it is a local file whose size can be had.
     bool IsUriAccesible() const;
-    bool IsUriAccesible(os::Patience& patience) const;
+    /// The same for a path that has been looked at.
+    bool IsUriAccesible(const os::FileLook& look) const;
 
     std::string getSourcePath() const { return m_sourcePath; }
     SupportedURISchemes getScheme() const { return m_scheme; }

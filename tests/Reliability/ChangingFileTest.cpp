@@ -7,6 +7,7 @@
 #include "Providers/SoftwareUpdate/UpdateTest.h"
 #include "Reliability/Effort.h"
 #include "Support/TestRoms.h"
+#include "Utils/Os/Linux/PatientReading.h"
 
 namespace {
 
@@ -14,12 +15,12 @@ namespace fs = std::filesystem;
 using test::CallResult;
 using utils::FirmwareType;
 
-/// Between two steps of an update.
-enum class When { BeforeSize, BeforeRead, BeforePreparation, BeforeWrite };
+/// Between two steps of an update. The file is looked at, opened and read; each is announced.
+enum class When { BeforeOpening = 2, BeforeReading = 3, BeforePreparation, BeforeWrite };
 
 class ChangingFileTest : public test::UpdateTest {
   protected:
-    ~ChangingFileTest() override { test::SyslogCapture::observe(nullptr); }
+    ~ChangingFileTest() override { os::beforeFileAccess = nullptr; }
 
     /// Has the change made once, when the update gets there.
     void arrange(When when, const std::function<void()>& change);
@@ -33,13 +34,14 @@ class ChangingFileTest : public test::UpdateTest {
     }
 
     bool m_changed = false;
-    int m_sizes = 0;
+    static inline int m_accesses = 0;
+    static inline std::function<void(int access)> m_atAccess;
     const std::string m_path = m_folder / "image.rom";
 };
 
 void ChangingFileTest::arrange(When when, const std::function<void()>& change) {
     m_changed = false;
-    m_sizes = 0;
+    m_accesses = 0;
     const auto changeOnce = [this, change] {
         if (!std::exchange(m_changed, true)) change();
     };
@@ -47,11 +49,10 @@ void ChangingFileTest::arrange(When when, const std::function<void()>& change) {
         const char* const step = when == When::BeforeWrite ? "writeFlashImage" : "prepareFlashImage";
         if (when >= When::BeforePreparation && called == step) changeOnce();
     };
-    // The size is asked for twice: to see whether there is a file, and to make room for it. Each says so.
-    test::SyslogCapture::observe([=, this](const std::string& line) {
-        if (line.find("Output size of file") == std::string::npos) return;
-        if (++m_sizes == (when == When::BeforeSize ? 1 : 2) && when <= When::BeforeRead) changeOnce();
-    });
+    m_atAccess = [=](int access) {
+        if (access == static_cast<int>(when)) changeOnce();
+    };
+    os::beforeFileAccess = [](const std::string&) { m_atAccess(++m_accesses); };
 }
 
 TEST_F(ChangingFileTest, WhatWasReadAndVerifiedIsWrittenWholeOrNothingIs) {
@@ -66,12 +67,12 @@ TEST_F(ChangingFileTest, WhatWasReadAndVerifiedIsWrittenWholeOrNothingIs) {
             make();
         };
     };
-    // The method's answer and the revision then in the flash; 2K: 2, with the claim kept.
+    // The method's answer and the revision then in the flash.
     struct Row {
         const char* change;
         std::function<void()> make;
-        const char* beforeSize;
-        const char* beforeRead;
+        const char* beforeOpening;
+        const char* beforeReading;
     };
     constexpr const char* kOld = "4096/2";
     constexpr const char* kNew = "4096/3";
@@ -79,15 +80,15 @@ TEST_F(ChangingFileTest, WhatWasReadAndVerifiedIsWrittenWholeOrNothingIs) {
              {"truncated", [this] { fs::resize_file(m_path, 700); }, "5/1", "2/1"},
              {"emptied", [this] { fs::resize_file(m_path, 0); }, "5/1", "2/1"},
              {"extended", [this] { fs::resize_file(m_path, 9000); }, kOld, kOld},
-             {"replaced", replaceBy(rom(3)), kNew, kNew},
-             {"replaced by a longer one", replaceBy(longer), kNew, kNew},
-             {"unlinked", inItsPlace([] {}), "2K/1", "2/1"},
-             {"a FIFO", inItsPlace([this] { mkfifo(m_path.c_str(), 0600); }), "2K/1", "2/1"},
-             {"a device", inItsPlace([this] { fs::create_symlink("/dev/zero", m_path); }), "2K/1", "2/1"},
-             {"a folder", inItsPlace([this] { fs::create_directory(m_path); }), "2K/1", "2/1"},
+             {"replaced", replaceBy(rom(3)), kNew, kOld},
+             {"replaced by a longer one", replaceBy(longer), kNew, kOld},
+             {"unlinked", inItsPlace([] {}), "5/1", kOld},
+             {"a FIFO", inItsPlace([this] { mkfifo(m_path.c_str(), 0600); }), "5/1", kOld},
+             {"a device", inItsPlace([this] { fs::create_symlink("/dev/zero", m_path); }), "5/1", kOld},
+             {"a folder", inItsPlace([this] { fs::create_directory(m_path); }), "5/1", kOld},
          }) {
         for (const When when :
-             {When::BeforeSize, When::BeforeRead, When::BeforePreparation, When::BeforeWrite}) {
+             {When::BeforeOpening, When::BeforeReading, When::BeforePreparation, When::BeforeWrite}) {
             SCOPED_TRACE(std::string(row.change) + " at step " + std::to_string(static_cast<int>(when)));
             fs::remove_all(m_path);
             fs::remove_all(m_adapters.stateDirectory());
@@ -96,13 +97,13 @@ TEST_F(ChangingFileTest, WhatWasReadAndVerifiedIsWrittenWholeOrNothingIs) {
             test::SyslogCapture::clear();
             const CallResult result = installAndEnd(uri);
             EXPECT_TRUE(m_changed);
-            const std::string outcome = std::to_string(result.returnValue) + (claim().empty() ? "/" : "K/") +
+            EXPECT_EQ(claim(), "");
+            const std::string outcome = std::to_string(result.returnValue) + '/' +
                                         test::componentsOf("eth0").substr(std::string("IMG_PXE ").size(), 1);
-            EXPECT_EQ(outcome, when == When::BeforeSize   ? row.beforeSize
-                               : when == When::BeforeRead ? row.beforeRead
-                                                          : kOld);
+            EXPECT_EQ(outcome, when == When::BeforeOpening   ? row.beforeOpening
+                               : when == When::BeforeReading ? row.beforeReading
+                                                             : kOld);
             EXPECT_EQ(test::SyslogCapture::contains("Job cannot read the URI for '"), outcome == "2/1");
-            setClaim("");
             test::count("files changed on the way");
         }
     }

@@ -86,29 +86,23 @@ namespace {
 /// The file of an image, on a file system that may not answer.
 class ImageFile {
   public:
-    ImageFile(const std::string& uri, const utils::ImageLimits& limits)
-        : m_uri(uri), m_limits(limits), m_patience(limits.silence) {}
+    explicit ImageFile(const std::string& uri) : m_uri(uri) {}
 
-    /// Finds the local path that the URI names.
+    /// Finds the local path that the URI names, and reads it: opened once, it cannot be exchanged meanwhile.
     void locate() {
-        utils::Uri parsed(m_uri);
+        const utils::Uri parsed(m_uri);
         if (!parsed.IsUriSupported())
             throw EInvalidUri(utils::formatStr("URI: %s is invalid", m_uri.c_str()));
         m_path = parsed.getSourcePath();
-        if (parsed.IsUriAccesible(m_patience)) return;
-        refuseIfSilent();
-        throw EUriDoesNotExist(utils::formatStr("URI: %s is invalid", m_uri.c_str()));
+        m_limits = utils::AutoSingleton<utils::SMASHv2Config>::getInstance()->getImageLimits();
+        m_file = look();
+        if (!parsed.IsUriAccesible(m_file))
+            throw EUriDoesNotExist(utils::formatStr("URI: %s is invalid", m_uri.c_str()));
     }
 
     /// The adapter API counts in 32 bits.
-    std::uint32_t measure() {
-        std::uint32_t size = 0;
-        try {
-            size = static_cast<std::uint32_t>(os::getFileSize(m_path, m_patience));
-        } catch (const utils::Exception&) {
-            refuseIfSilent();
-            throw;
-        }
+    std::uint32_t measure() const {
+        const auto size = static_cast<std::uint32_t>(os::getFileSize(m_path, m_file));
         if (m_limits.largest != 0 && size > m_limits.largest) {
             QUENX_ERROR("%s has %u bytes, more than the %u that LargestImage allows", m_path.c_str(), size,
                         m_limits.largest);
@@ -117,29 +111,30 @@ class ImageFile {
         return size;
     }
 
-    Buffer read(std::uint32_t size) {
-        std::optional<os::FileContent> content = os::readFile(m_path, size, m_patience);
-        refuseIfSilent();
+    Buffer takeBytes() {
         // The file may have shrunk since it was measured.
-        if (!content || content->count != size) refuse();
-        return std::move(content->bytes);
+        if (m_file.count != static_cast<std::size_t>(m_file.size)) refuse();
+        return std::move(m_file.bytes);
     }
 
   private:
     [[noreturn]] void refuse() const {
         throw EImageReadError(utils::formatStr("Image read error: %s (%s)", m_uri.c_str(), m_path.c_str()));
     }
-    void refuseIfSilent() const {
-        if (!m_patience.isOver) return;
+    os::FileLook look() const {
+        os::Patience patience(m_limits.silence);
+        std::optional<os::FileLook> found =
+            os::lookAtFile(m_path, m_limits.largest != 0 ? m_limits.largest : INT32_MAX, patience);
+        if (found) return std::move(*found);
         QUENX_ERROR("%s is not read: its file system did not answer for %d seconds, now or earlier",
                     m_path.c_str(), static_cast<int>(m_limits.silence.count()));
         refuse();
     }
 
     const std::string& m_uri;
-    const utils::ImageLimits m_limits;
-    os::Patience m_patience;
+    utils::ImageLimits m_limits;
     std::string m_path;
+    os::FileLook m_file;
 };
 
 [[noreturn]] void refuseWithoutForce(const std::string& uri) {
@@ -191,11 +186,11 @@ void judge(int status, bool force, const std::string& uri, const std::string& ad
 PreparedImage readAndPrepare(const UpdateOrder& order, bool& isAskingAdapter) {
     const auto& [adapterName, uri, options, values] = order;
     utils::formatDebugLog(__FILE__, kCheckAndVerifyImage, __LINE__, "Checking URI : '%s' ", uri.c_str());
-    ImageFile file(uri, utils::AutoSingleton<utils::SMASHv2Config>::getInstance()->getImageLimits());
+    ImageFile file(uri);
     file.locate();
-    // Measured once: buffers, reading and preparation must agree on one size, whatever happens to the file.
+    // Measured once: buffers and preparation must agree on one size, whatever happens to the file.
     const std::uint32_t fileSize = file.measure();
-    const Buffer source = file.read(fileSize);
+    const Buffer source = file.takeBytes();
     Buffer image = std::make_unique_for_overwrite<std::uint8_t[]>(fileSize);
     std::uint32_t imageSize = fileSize;
     std::vector<utils::FirmwareType> types = getTargetTypes(options, values);

@@ -11,6 +11,7 @@
 #include <condition_variable>
 #include <filesystem>
 #include <mutex>
+#include <new>
 #include <utility>
 
 #include "Utils/Os/Linux/SignalsBlocked.h"
@@ -31,10 +32,10 @@ constexpr unsigned int kMaxLeftBehind = 16;
 /// One file, looked at and perhaps read on a thread of its own.
 struct Reading {
     std::string path;
-    std::string key;       ///< one for all spellings of the path
-    std::size_t size = 0;  ///< how much to read; 0 to look only
-    FileMeasure measure{};
-    FileContent content{};
+    std::string key;        ///< one for all spellings of the path
+    std::int64_t most = 0;  ///< a larger file is not read
+    FileLook found{};
+    bool isWithoutMemory = false;
     std::atomic<std::uint64_t> steps = 0;
     bool isDone = false;
     bool isLeftBehind = false;
@@ -72,21 +73,24 @@ void reached(Reading& reading) {
     if (const auto test = beforeFileAccess.load()) test(reading.path);
 }
 
-FileMeasure kindOf(const struct stat& status) {
-    if (S_ISDIR(status.st_mode)) return {FileKind::Directory, 0};
-    if (S_ISREG(status.st_mode)) return {FileKind::Regular, status.st_size};
-    return {};
+FileKind kindOf(const struct stat& status) {
+    if (S_ISDIR(status.st_mode)) return FileKind::Directory;
+    return S_ISREG(status.st_mode) ? FileKind::Regular : FileKind::CannotBeOpened;
 }
 
+/// As many bytes as the file had when it was opened, even if it grows.
 void readFrom(int file, Reading& reading) {
-    FileContent& content = reading.content;
-    while (content.count < reading.size) {
+    FileLook& found = reading.found;
+    const auto size = static_cast<std::size_t>(found.size);
+    found.bytes.reset(new (std::nothrow) std::uint8_t[size]);
+    reading.isWithoutMemory = found.bytes == nullptr;
+    while (!reading.isWithoutMemory && found.count < size) {
         reached(reading);
         const ssize_t got =
-            ::read(file, content.bytes.get() + content.count, std::min(kStep, reading.size - content.count));
+            ::read(file, found.bytes.get() + found.count, std::min(kStep, size - found.count));
         if (got < 0 && errno == EINTR) continue;
         if (got <= 0) return;
-        content.count += static_cast<std::size_t>(got);
+        found.count += static_cast<std::size_t>(got);
     }
 }
 
@@ -97,15 +101,18 @@ void carryOut(Reading& reading) {
     reached(reading);
     // Told before the opening: to open a device can rewind a tape or reset a modem.
     if (::stat(reading.path.c_str(), &status) != 0) return;
-    if (kindOf(status).kind == FileKind::CannotBeOpened) return;
+    if (kindOf(status) == FileKind::CannotBeOpened) return;
     reached(reading);
     // A FIFO that took the file's place after the look at it must not block the opening.
     const Descriptor file(::open(reading.path.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK | O_NOCTTY));
     // A process without standard input gets number 0 here, and counts as one that cannot open files.
     if (file.number() <= 0) return;
     const bool isKnown = ::fstat(file.number(), &status) == 0;
-    reading.measure = isKnown ? kindOf(status) : FileMeasure{FileKind::CannotBeLookedAt, 0};
-    if (reading.measure.kind == FileKind::Regular) readFrom(file.number(), reading);
+    FileLook& found = reading.found;
+    found.kind = isKnown ? kindOf(status) : FileKind::CannotBeLookedAt;
+    if (found.kind != FileKind::Regular) return;
+    found.size = status.st_size;
+    if (found.size <= reading.most) readFrom(file.number(), reading);
 }
 
 void* readerThread(void* argument) {
@@ -179,29 +186,18 @@ bool carryOutPatiently(std::unique_ptr<Reading>& reading, Patience& patience) {
     return false;
 }
 
-std::unique_ptr<Reading> makeReading(const std::string& path) {
-    auto reading = std::make_unique<Reading>();
-    reading->path = path;
-    reading->key = std::filesystem::path(path).lexically_normal();
-    return reading;
-}
-
 }  // namespace
 
 std::atomic<void (*)(const std::string& path)> beforeFileAccess = nullptr;
 
-std::optional<FileMeasure> measureFile(const std::string& path, Patience& patience) {
-    std::unique_ptr<Reading> reading = makeReading(path);
+std::optional<FileLook> lookAtFile(const std::string& path, std::int64_t most, Patience& patience) {
+    auto reading = std::make_unique<Reading>();
+    reading->path = path;
+    reading->key = std::filesystem::path(path).lexically_normal();
+    reading->most = most;
     if (!carryOutPatiently(reading, patience)) return std::nullopt;
-    return reading->measure;
-}
-
-std::optional<FileContent> readFile(const std::string& path, std::size_t size, Patience& patience) {
-    std::unique_ptr<Reading> reading = makeReading(path);
-    reading->size = size;
-    reading->content.bytes = std::make_unique_for_overwrite<std::uint8_t[]>(size);
-    if (!carryOutPatiently(reading, patience)) return std::nullopt;
-    return std::move(reading->content);
+    if (reading->isWithoutMemory) throw std::bad_alloc();
+    return std::move(reading->found);
 }
 
 }  // namespace os

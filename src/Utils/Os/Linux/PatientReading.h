@@ -29,25 +29,22 @@ struct Patience {
 
 enum class FileKind { Regular, Directory, CannotBeOpened, CannotBeLookedAt };
 
-struct FileMeasure {
+/// What a path names, and what could be read of it.
+struct FileLook {
     FileKind kind = FileKind::CannotBeOpened;
-    std::int64_t size = 0;  ///< of a regular file
-};
-
-struct FileContent {
+    std::int64_t size = 0;  ///< of a regular file, when it was opened
     std::unique_ptr<std::uint8_t[]> bytes;
-    std::size_t count = 0;  ///< how many could be read
+    std::size_t count = 0;  ///< how many could be read; fewer than `size` if the file shrank
 };
 
-/// What a path names. Only regular files and directories are opened: a FIFO never blocks, and a device is not
-/// touched. Nothing when the file was given up; then `patience` is over, and further calls for this path
-/// answer so at once until the one that hangs has come back.
-QUENX_EXPORT std::optional<FileMeasure> measureFile(const std::string& path, Patience& patience);
-
-/// The first `size` bytes of a regular file, or as many as it has. Nothing likewise.
+/// Opens what the path names, once, and reads a regular file of at most `most` bytes whole. Only regular
+/// files and directories are opened: a FIFO never blocks, and a device is not touched. Nothing when the file
+/// was given up; then `patience` is over, and further calls for this path answer so at once until the one
+/// that hangs has come back.
+/// @param most  a larger file is not read; -1 reads none
 /// @throws std::bad_alloc
-QUENX_EXPORT std::optional<FileContent> readFile(const std::string& path, std::size_t size,
-                                                 Patience& patience);
+QUENX_EXPORT std::optional<FileLook> lookAtFile(const std::string& path, std::int64_t most,
+                                                Patience& patience);
 
 /// A test's own file system: called with the path before each system call for a file, and may block. Null
 /// unless a test sets it.

@@ -92,18 +92,17 @@ void openStandardDescriptors() noexcept {
 
 std::int32_t getFileSize(const std::string& path) {
     Patience patience;
-    return getFileSize(path, patience);
+    return getFileSize(path, lookAtFile(path, -1, patience).value_or(FileLook()));
 }
 
-std::int32_t getFileSize(const std::string& path, Patience& patience) {
-    const std::optional<FileMeasure> found = measureFile(path, patience);
-    if (found && found->kind == FileKind::CannotBeLookedAt)
+std::int32_t getFileSize(const std::string& path, const FileLook& look) {
+    if (look.kind == FileKind::CannotBeLookedAt)
         throw utils::Exception(utils::formatStr("Could not get info about the file %s", path.c_str()));
-    if (found && found->kind == FileKind::Directory) {
+    if (look.kind == FileKind::Directory) {
         throw utils::Exception(utils::formatStr("The specyfied URI %s points to a directory", path.c_str()));
     }
-    if (!found || found->kind != FileKind::Regular || found->size > INT32_MAX) failToOpen(path);
-    const auto size = static_cast<std::int32_t>(found->size);
+    if (look.kind != FileKind::Regular || look.size > INT32_MAX) failToOpen(path);
+    const auto size = static_cast<std::int32_t>(look.size);
     QUENX_DEBUG("Output size of file: %d", size);
     return size;
 }

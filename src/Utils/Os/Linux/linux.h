@@ -16,7 +16,7 @@
 /// What this system asks the operating system for. Any thread may call.
 namespace os {
 
-struct Patience;
+struct FileLook;
 
 /// The variable's value, null when it is not set. Owned by the environment.
 QUENX_EXPORT const char* getEnvVariable(const char* name) noexcept;
@@ -40,11 +40,12 @@ QUENX_EXPORT void openStandardDescriptors() noexcept;
 
 /// The size in bytes of a regular file.
 /// @throws utils::Exception "Could not open the file %s" for what does not exist, cannot be opened, has a NUL
-/// in its path, is larger than 2^31-1 bytes, was given up (`patience` is over then) or is neither a file nor
+/// in its path, is larger than 2^31-1 bytes, did not answer for 30 seconds or is neither a file nor
 /// a directory, which is told before it is opened: a FIFO never blocks; "Could not get info about the file
 /// %s"; "The specyfied URI %s points to a directory"
 QUENX_EXPORT std::int32_t getFileSize(const std::string& path);
-QUENX_EXPORT std::int32_t getFileSize(const std::string& path, Patience& patience);
+/// The same for a file that has been looked at.
+QUENX_EXPORT std::int32_t getFileSize(const std::string& path, const FileLook& look);
 
 /// Fills the buffer from the beginning of a regular file. Returns the bytes read: fewer than asked for when
 /// the file is shorter, cannot be read on, or is none. Never blocks on a FIFO or a device, never throws.
