@@ -18,7 +18,7 @@ namespace {
 struct Store {
     std::mutex mutex;
     std::vector<SyslogLine> lines;
-    std::string identity;
+    SyslogOpening opening;
     std::function<void(const std::string&)> observer;
     bool keepsLines = true;
 };
@@ -36,7 +36,7 @@ void record(int priority, const char* format, va_list arguments) {
     vsnprintf(buffer, sizeof buffer, format, arguments);
     std::function<void(const std::string&)> observer;
     {
-        std::lock_guard<std::mutex> lock(store().mutex);
+        const std::lock_guard lock(store().mutex);
         if (store().keepsLines) store().lines.push_back({priority, buffer});
         observer = store().observer;
     }
@@ -47,21 +47,21 @@ void record(int priority, const char* format, va_list arguments) {
 }  // namespace
 
 void SyslogCapture::clear() {
-    std::lock_guard<std::mutex> lock(store().mutex);
+    const std::lock_guard lock(store().mutex);
     store().lines.clear();
-    store().identity.clear();
+    store().opening = {};
 }
 
 std::vector<SyslogLine> SyslogCapture::lines() {
-    std::lock_guard<std::mutex> lock(store().mutex);
+    const std::lock_guard lock(store().mutex);
     return store().lines;
 }
 
 std::size_t SyslogCapture::count(std::string_view part) {
-    const std::vector<SyslogLine> all = lines();
-    return static_cast<std::size_t>(std::count_if(all.begin(), all.end(), [&](const SyslogLine& line) {
+    const auto holdsPart = [part](const SyslogLine& line) {
         return line.text.find(part) != std::string::npos;
-    }));
+    };
+    return static_cast<std::size_t>(std::ranges::count_if(lines(), holdsPart));
 }
 
 std::vector<std::string> SyslogCapture::messages(std::string_view level) {
@@ -69,24 +69,24 @@ std::vector<std::string> SyslogCapture::messages(std::string_view level) {
     std::vector<std::string> found;
     for (const SyslogLine& line : lines()) {
         const std::size_t end = line.text.rfind("\" (");
-        if (line.text.compare(0, begin.size(), begin) != 0 || end == std::string::npos) continue;
-        found.push_back(line.text.substr(begin.size(), end - begin.size()));
+        if (line.text.starts_with(begin) && end != std::string::npos)
+            found.push_back(line.text.substr(begin.size(), end - begin.size()));
     }
     return found;
 }
 
-std::string SyslogCapture::identity() {
-    std::lock_guard<std::mutex> lock(store().mutex);
-    return store().identity;
+SyslogOpening SyslogCapture::opening() {
+    const std::lock_guard lock(store().mutex);
+    return store().opening;
 }
 
 void SyslogCapture::observe(std::function<void(const std::string&)> observer) {
-    std::lock_guard<std::mutex> lock(store().mutex);
+    const std::lock_guard lock(store().mutex);
     store().observer = std::move(observer);
 }
 
 void SyslogCapture::keep(bool lines) {
-    std::lock_guard<std::mutex> lock(store().mutex);
+    const std::lock_guard lock(store().mutex);
     store().keepsLines = lines;
 }
 
@@ -95,9 +95,9 @@ void SyslogCapture::keep(bool lines) {
 // The C library's functions that the log uses, and the form that a fortified build calls instead.
 extern "C" {
 
-QUENX_EXPORT void openlog(const char* identity, int, int) {
-    std::lock_guard<std::mutex> lock(test::store().mutex);
-    test::store().identity = identity;
+QUENX_EXPORT void openlog(const char* identity, int options, int facility) {
+    const std::lock_guard lock(test::store().mutex);
+    test::store().opening = {identity, options, facility};
 }
 
 QUENX_EXPORT void closelog() {}

@@ -17,6 +17,13 @@ struct SyslogLine {
     std::string text;
 };
 
+/// What openlog was told; nothing when it was not called.
+struct SyslogOpening {
+    std::string identity{};
+    int options = 0;
+    int facility = 0;
+};
+
 /// Takes the place of the C library's syslog in every test program, for the shared libraries' calls too: what
 /// would have reached the system log, expanded as syslog does it, is kept here. Thread-safe.
 class SyslogCapture {
@@ -31,8 +38,8 @@ class SyslogCapture {
     static bool contains(std::string_view part) { return count(part) != 0; }
     /// The messages of the lines "[level] "message" (...)", in order; other lines are left out.
     static std::vector<std::string> messages(std::string_view level = "debug");
-    /// The identity given to openlog, empty if it was not called since clear().
-    static std::string identity();
+    /// The last opening since clear().
+    static SyslogOpening opening();
 
     /// Has every line shown to the observer, on the thread that writes it; null for none.
     static void observe(std::function<void(const std::string& line)> observer);

@@ -32,6 +32,10 @@ struct Slow : utils::AutoSingleton<Slow> {
     bool isWhole = false;
 };
 
+std::string found(const char* name, const void* instance) {
+    return utils::formatStr("Instance of %s (#%p)", name, instance);
+}
+
 }  // namespace
 
 TEST(SingletonTest, NeverBringsBackADeadInstanceAfterDestructionOutOfOrder) {
@@ -41,8 +45,7 @@ TEST(SingletonTest, NeverBringsBackADeadInstanceAfterDestructionOutOfOrder) {
     std::optional<Plain> third(std::in_place);
     EXPECT_EQ(Plain::getInstance(), &*third);
     EXPECT_EQ(SyslogCapture::count("\"New singleton instance for Plain\""), 3U);
-    EXPECT_TRUE(SyslogCapture::contains(
-        utils::formatStr("\"Instance of Plain (#%p)\"", static_cast<void*>(&*third))));
+    EXPECT_EQ(SyslogCapture::messages().back(), found("Plain", &*third));
     second.reset();
     EXPECT_EQ(Plain::getInstance(), &*first);  // whoever was current
     third.reset();
@@ -52,12 +55,11 @@ TEST(SingletonTest, NeverBringsBackADeadInstanceAfterDestructionOutOfOrder) {
 }
 
 TEST(AutoSingletonTest, MakesOneWholeInstanceOnTwoFirstCallsThatANewerOneHides) {
-    std::vector<std::thread> threads;
-    for (int i = 0; i < 8; ++i) {
-        threads.emplace_back([] { EXPECT_TRUE(Slow::getInstance()->isWhole); });
+    {
+        std::vector<std::jthread> threads;
+        for (int i = 0; i < 8; ++i)
+            threads.emplace_back([] { EXPECT_TRUE(Slow::getInstance()->isWhole); });
     }
-    for (std::thread& thread : threads)
-        thread.join();
     EXPECT_EQ(Slow::constructed, 1);
     Slow* const created = Slow::getInstance();
     {
@@ -65,6 +67,23 @@ TEST(AutoSingletonTest, MakesOneWholeInstanceOnTwoFirstCallsThatANewerOneHides) 
         EXPECT_EQ(Slow::getInstance(), &local);
     }
     EXPECT_EQ(Slow::getInstance(), created);
+}
+
+TEST(OSLockerTest, IsTakenAndFreedByAScopeThatNeverWaits) {
+    os::OSLockerLinux locker;
+    const test::LogLevelGuard guard(2);
+    {
+        const OSLocker::AutoOSLocker scope;
+        EXPECT_EQ(locker.Lock(), 2);
+    }
+    const std::string instance = found("OSLocker", &locker);
+    EXPECT_EQ(SyslogCapture::messages(), (std::vector<std::string>{"autolocking semaphore", instance,
+                                                                   "autoreleasing semaphore", instance}));
+    EXPECT_EQ(locker.Lock(), 0);
+    { const OSLocker::AutoOSLocker whileBusy; }
+    EXPECT_EQ(locker.Lock(), 0);
+    EXPECT_EQ(locker.UnLock(), 0);
+    EXPECT_EQ(locker.Lock(), 0);
 }
 
 TEST(OSLockerTest, FailsTheBeginningButNotTheEndOfAScopeWhenMissing) {

@@ -23,10 +23,13 @@ TEST(UriTest, GivesSchemePathAndLogLine) {
         {"file:///a:b::c:", Scheme::File, "/a:b::c:", nullptr},
         {"file:///a%20b%2F", Scheme::File, "/a%20b%2F", nullptr},
         {"file://", Scheme::File, "", nullptr},
+        {"data://x", Scheme::Data, "x", nullptr},
+        {"ftp://x", Scheme::Ftp, "x", nullptr},
+        {"http://x", Scheme::Http, "x", nullptr},
         {"https://host:80/x", Scheme::Https, "host:80/x", nullptr},
+        {"nfs://x", Scheme::Nfs, "x", nullptr},
         {"tftp://x", Scheme::Tftp, "x", nullptr},
         {"file:/x", Scheme::Unknown, "", "Uknown URI format of 'file:/x'"},
-        {"file:", Scheme::Unknown, "", "Uknown URI format of 'file:'"},
         {"://x", Scheme::Unknown, "", "Uknown URI format of '://x'"},
         {" file:///x", Scheme::Unknown, "", "Uknown URI format of ' file:///x'"},
         {"/opt/%n%s", Scheme::Unknown, "", "Incorrect URI format of '/opt/%n%s'"},
@@ -41,4 +44,8 @@ TEST(UriTest, GivesSchemePathAndLogLine) {
         EXPECT_EQ(uri.IsUriSupported(), row.scheme == Scheme::File);
         EXPECT_EQ(test::SyslogCapture::messages(), row.line == nullptr ? Lines{} : Lines{row.line});
     }
+    Uri reused("file:///kept");
+    reused.parseUri("no scheme");
+    EXPECT_EQ(reused.getScheme(), Scheme::Unknown);
+    EXPECT_EQ(reused.getSourcePath(), "/kept");
 }

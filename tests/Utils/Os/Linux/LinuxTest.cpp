@@ -35,14 +35,12 @@ TEST(FileSizeTest, IsGivenForRegularFilesOnly) {
     ASSERT_EQ(symlink(file.c_str(), (folder / "link").c_str()), 0);
     EXPECT_EQ(sizeOf(folder / "link"), "5");
     EXPECT_EQ(test::SyslogCapture::messages(), std::vector<std::string>{"Output size of file: 5"});
-    const std::string headExists = file + std::string(1, '\0');
-    EXPECT_EQ(sizeOf(headExists), couldNotOpen(file));
+    EXPECT_EQ(sizeOf(file + '\0'), couldNotOpen(file)) << "only the head of the path exists";
     EXPECT_EQ(sizeOf(folder / "missing"), couldNotOpen(folder / "missing"));
     EXPECT_EQ(sizeOf("/dev/null"), couldNotOpen("/dev/null"));
     EXPECT_EQ(sizeOf(folder.path()), "SMASHv2:The specyfied URI " + folder.path() + " points to a directory");
-    const std::string fifo = folder / "fifo";
-    ASSERT_EQ(mkfifo(fifo.c_str(), 0600), 0);
-    EXPECT_EQ(sizeOf(fifo), couldNotOpen(fifo));  // and does not hang
+    ASSERT_EQ(mkfifo((folder / "fifo").c_str(), 0600), 0);
+    EXPECT_EQ(sizeOf(folder / "fifo"), couldNotOpen(folder / "fifo")) << "and does not hang";
 }
 
 TEST(FileSizeTest, FailsForUnreadableFilesAndDescriptorZero) {

@@ -100,18 +100,24 @@ TEST_F(ThreadTest, AloneEndsOnAnExceptionOfTheBody) {
     waitUntil([] { return SyslogCapture::contains("ended by an unknown exception"); });
 }
 
+TEST(MutexTest, CountsLocksAndUnlocks) {
+    utils::Mutex mutex;
+    const unsigned int locks = utils::Mutex::lockCounter, unlocks = utils::Mutex::unlockCounter;
+    { const utils::Mutex::AutoLocker locker(mutex); }
+    EXPECT_EQ(utils::Mutex::lockCounter - locks, 1U);
+    EXPECT_EQ(utils::Mutex::unlockCounter - unlocks, 1U);
+}
+
 TEST_F(ThreadTest, LeavesSignalsToTheThreadsOfItsHost) {
-    std::atomic<int> asked{-1}, fault{-1};
+    std::atomic<bool> isAsked{false};
     Worker worker([&](Worker&) {
         sigset_t blocked;
         pthread_sigmask(SIG_BLOCK, nullptr, &blocked);
-        fault = sigismember(&blocked, SIGSEGV);
-        asked = sigismember(&blocked, SIGINT);
+        EXPECT_TRUE(sigismember(&blocked, SIGINT) == 1 && sigismember(&blocked, SIGSEGV) == 0);
+        isAsked = true;
     });
     worker.start();
-    waitUntil([&] { return asked != -1; });
-    EXPECT_EQ(asked, 1);
-    EXPECT_EQ(fault, 0);
+    waitUntil([&] { return isAsked.load(); });
 }
 
 TEST_F(ThreadTest, DoesNotJoinItselfWhenItDestroysItself) {
