@@ -90,10 +90,10 @@ bool typesDiffer(const PreparationTarget& target, const RomFile& chosen) {
 /// Names the component that would go back; both versions, installed one first.
 std::string downgrade(const PreparationTarget& target, const RomFile& chosen) {
     for (const utils::FirmwareVersionInfo& component : chosen.components()) {
-        const std::uint32_t installed = versionOf(target.components, component.type).value_or(0);
-        if (component.version < installed)
+        const auto installed = versionOf(target.components, component.type);
+        if (installed && component.version < *installed)
             return std::string(firmwareTypeName(component.type)) + " would go back from version " +
-                   std::to_string(installed) + " (installed) to " + std::to_string(component.version) +
+                   std::to_string(*installed) + " (installed) to " + std::to_string(component.version) +
                    " (in the file)";
     }
     return {};
