@@ -24,27 +24,48 @@ std::string adapterWith(const std::string& line) {
     return adapterAt("0000:03:00.0") + line + "\n";
 }
 
-TEST(AdapterDescriptionTest, TakesKeysThatFewAdaptersHave) {
-    const std::string text = adapterWith(R"(subsystem_id = "1af4:1100"
-components = [ { type = "IMG_CLP", revision = 65535 }, { type = "IMG_UEFI" } ]
-[[adapter.fault]]
-at = "capability-word"
-action = "stall"
-milliseconds = 5
-once = true
-text = "bank gone")");
-    const ma::AdapterDescription adapter = ma::parseAdapterDescriptions(text, "a.toml").at(0);
-    EXPECT_EQ("1af4:1100", ma::formatIds(adapter.ids.subsystemVendor, adapter.ids.subsystemDevice));
-    EXPECT_EQ("IMG_CLP 65535, IMG_UEFI 1", test::describeComponents(adapter.components));
-    const ma::Fault& fault = adapter.faults.at(0);
-    EXPECT_TRUE(fault.at == ma::Operation::CapabilityWord && fault.action == ma::Fault::Action::Stall);
-    EXPECT_TRUE(fault.once && fault.milliseconds == 5 && fault.text == "bank gone");
+ma::AdapterDescription parsed(const std::string& text) {
+    return ma::parseAdapterDescriptions(text, "a.toml").at(0);
+}
+
+TEST(AdapterDescriptionTest, TakesKeysThatFewAdaptersHaveAndFillsInOthers) {
+    const ma::AdapterDescription full = parsed(adapterWith(R"(subsystem_id = "1af4:1100"
+components = [ { type = "IMG_CLP", revision = 65535 }, { type = "IMG_UEFI" } ])"));
+    EXPECT_EQ("1af4:1100", ma::formatIds(full.ids.subsystemVendor, full.ids.subsystemDevice));
+    EXPECT_EQ("IMG_CLP 65535, IMG_UEFI 1", test::describeComponents(full.components));
+    const ma::AdapterDescription least = parsed(adapterWith(""));
+    EXPECT_EQ("1af4:1041", ma::formatIds(least.ids.subsystemVendor, least.ids.subsystemDevice));
+    EXPECT_TRUE(least.linkUp && least.canBeUpdated && least.speed == 0 && least.writeSpeed == 0);
+    EXPECT_EQ(ma::BootType::None, least.bootType);
+    unsigned int number = 0;  // as the flash keeps it
+    for (const std::string word : {"none", "pxe", "iscsi", "fcoe", "uefi"})
+        EXPECT_EQ(static_cast<ma::BootType>(number++),
+                  parsed(adapterWith("boot_type = \"" + word + "\"")).bootType);
+}
+
+TEST(AdapterDescriptionTest, ReadsFaults) {
+    using enum ma::Operation;
+    using enum ma::Fault::Action;
+    const std::vector<ma::Fault> faults = parsed(adapterWith(R"(fault = [
+{ at = "enumerate", action = "fail" }, { at = "pci-address", action = "throw" },
+{ at = "firmware-version", action = "stall" }, { at = "prepare", action = "power-loss" },
+{ at = "write", action = "kill" }, { at = "capability-word", action = "fail" },
+{ at = "boot-type", action = "fail", percent = 7, code = 8, milliseconds = 9, once = true, text = "gone" },
+{ at = "info", action = "fail" } ])"))
+                                              .faults;
+    const std::pair<ma::Operation, ma::Fault::Action> expected[] = {
+        {Enumerate, Fail}, {PciAddress, Throw},    {FirmwareVersion, Stall}, {Prepare, PowerLoss},
+        {Write, Kill},     {CapabilityWord, Fail}, {BootType, Fail},         {Info, Fail}};
+    for (std::size_t i = 0; i < std::size(expected); ++i)
+        EXPECT_TRUE(faults.at(i).at == expected[i].first && faults[i].action == expected[i].second) << i;
+    EXPECT_TRUE(faults[6].percent == 7 && faults[6].code == 8 && faults[6].milliseconds == 9);
+    EXPECT_TRUE(faults[6].once && faults[6].text == "gone");
+    EXPECT_TRUE(faults[7].percent == 0 && faults[7].code == 6 && faults[7].milliseconds == 0);
+    EXPECT_TRUE(!faults[7].once && faults[7].text == "ordered fault: fail at info") << faults[7].text;
 }
 
 TEST(AdapterDescriptionTest, ReadsAddresses) {
-    const auto addressOf = [](const std::string& address) {
-        return ma::parseAdapterDescriptions(adapterAt(address), "a.toml").at(0).address;
-    };
+    const auto addressOf = [](const std::string& address) { return parsed(adapterAt(address)).address; };
     EXPECT_EQ((utils::PCIAddr{0x1f, 0x1e, 7, false, "0000:1f:1e.7"}), addressOf("1f:1e.7"));
     EXPECT_EQ((utils::PCIAddr{0x1f, 0x1e, 0, true, "0001:1f:1e"}), addressOf("0001:1F:1e"));
     for (const char* address :
@@ -54,7 +75,6 @@ TEST(AdapterDescriptionTest, ReadsAddresses) {
 
 TEST(AdapterDescriptionTest, NamesMistakesWithPlaceAndRemedy) {
     const std::pair<std::string, const char*> table[] = {
-        {"[[adapter]]\nname =", "a.toml, line 2: "},
         {"\n[adaptor]", "a.toml, line 2: adapter description: unknown key \"adaptor\"; the keys are adapter"},
         {"adapter = [ 1 ]", "line 1: adapter description: \"adapter\" must be a list of tables"},
         {"[[[", "a.toml, line 1: "},
@@ -78,8 +98,8 @@ TEST(AdapterDescriptionTest, NamesMistakesWithPlaceAndRemedy) {
         {adapterWith("link = 1"), "\"link\" must be true or false"},
         {adapterWith("boot_type = \"disk\""), "is \"disk\", it must be none, pxe, iscsi, fcoe or uefi"},
         {adapterWith("subsystem_id = \"1af4\""), "\"subsystem_id\" is \"1af4\", it must be like"},
-        {adapterWith("components = [ { revision = 1 } ]"), "a component of \"eth0\": \"type\" is missing"},
-        {adapterWith("components = [ { type = \"IMG_PXE\", revision = 65536 } ]"), "from 0 to 65535"},
+        {adapterWith("components = [ { type = \"IMG_PXE\", revision = 65536 } ]"),
+         "a component of \"eth0\": \"revision\" must be a whole number from 0 to 65535"},
         {adapterWith("[[adapter.fault]]\naction = \"kill\""), "a fault of \"eth0\": \"at\" is missing"},
         {adapterWith("[[adapter.fault]]\nat = \"write\"\naction = \"burn\""), "line 8: a fault of \"eth0\""},
         {adapterWith("") + adapterWith(""), "two adapters are called \"eth0\""},

@@ -6,21 +6,16 @@
 namespace test {
 
 const char* const kTestAdapters = R"(adapter = [
-{ name = "eth0", pci_address = "0000:03:00.0", pci_id = "1af4:1041", components = [
-  { type = "IMG_PXE", revision = 1 }, { type = "IMG_UEFI", revision = 0 }
-  ], mac = "52:54:00:00:00:10", speed = 10_000_000_000 },
-{ name = "eth1", pci_address = "0000:03:00.1", pci_id = "1af4:1041", components = [
-  { type = "IMG_PXE", revision = 1 }, { type = "IMG_UEFI", revision = 0 }
-  ], mac = "52:54:00:00:00:11", speed = 10_000_000_000, link = false },
-{ name = "eth2", pci_address = "0000:04:00.0", pci_id = "10ec:8139", components = [
-  { type = "IMG_PXE", revision = 1 }, { type = "IMG_UEFI", revision = 0 }
-  ], mac = "52:54:00:00:00:12", speed = 100_000_000 },
-{ name = "eth3", pci_address = "0000:05:00.0", pci_id = "1022:2000", components = [
-  { type = "IMG_PXE", revision = 1 }
-  ], mac = "52:54:00:00:00:13", updatable = false },
-{ name = "eth4", pci_address = "0000:06:00.0", pci_id = "15ad:07b0", components = [
-  { type = "IMG_iSCSI", revision = 1 }, { type = "IMG_UEFI", revision = 0 }
-  ], mac = "52:54:00:00:00:14", boot_type = "iscsi" },
+{ name = "eth0", pci_address = "0000:03:00.0", pci_id = "1af4:1041", mac = "52:54:00:00:00:10", components = [
+  { type = "IMG_PXE" }, { type = "IMG_UEFI", revision = 0 } ], speed = 10_000_000_000 },
+{ name = "eth1", pci_address = "0000:03:00.1", pci_id = "1af4:1041", mac = "52:54:00:00:00:11", components = [
+  { type = "IMG_PXE" }, { type = "IMG_UEFI", revision = 0 } ], speed = 10_000_000_000, link = false },
+{ name = "eth2", pci_address = "0000:04:00.0", pci_id = "10ec:8139", mac = "52:54:00:00:00:12", components = [
+  { type = "IMG_PXE" }, { type = "IMG_UEFI", revision = 0 } ], speed = 100_000_000 },
+{ name = "eth3", pci_address = "0000:05:00.0", pci_id = "1022:2000", mac = "52:54:00:00:00:13", components = [
+  { type = "IMG_PXE" } ], updatable = false },
+{ name = "eth4", pci_address = "0000:06:00.0", pci_id = "15ad:07b0", mac = "52:54:00:00:00:14", components = [
+  { type = "IMG_iSCSI" }, { type = "IMG_UEFI", revision = 0 } ], boot_type = "iscsi" },
 ]
 )";
 
