@@ -2,6 +2,7 @@
 #include "Framework/Requests/CimOperations.h"
 
 #include <algorithm>
+#include <span>
 
 #include "Framework/Model/CimInstance.h"
 #include "Framework/Model/CimProperty.h"
@@ -20,12 +21,19 @@ PropertyValue readProperty(const CimProperty& property, const std::string& names
 }
 
 /// The key properties of a class, the nearest declaration of each.
-std::vector<PropertyDeclaration> keysOf(const ClassChain& chain) {
-    std::vector<PropertyDeclaration> keys;
+using DeclaredKeys = std::vector<const PropertyDeclaration*>;
+
+const PropertyDeclaration* findKey(const DeclaredKeys& keys, std::string_view name) {
+    const auto found = std::ranges::find_if(keys, [&](const auto* key) { return sameName(key->name, name); });
+    return found == keys.end() ? nullptr : *found;
+}
+
+DeclaredKeys keysOf(const ClassChain& chain) {
+    DeclaredKeys keys;
     // From the class to the root, so that a reference that a subclass narrows counts as narrowed.
     for (const auto& declaration : chain) {
         for (const PropertyDeclaration& property : declaration->properties) {
-            if (property.isKey && findByName(keys, property.name) == nullptr) keys.push_back(property);
+            if (property.isKey && findKey(keys, property.name) == nullptr) keys.push_back(&property);
         }
     }
     return keys;
@@ -51,7 +59,7 @@ CimScalar typedKey(const PropertyDeclaration& declared, const CimScalar& value, 
 }
 
 CimPath typedKeys(const CimPath& path, const ClassChain& chain, const ClassLookup& classes) {
-    const std::vector<PropertyDeclaration> declared = keysOf(chain);
+    const DeclaredKeys declared = keysOf(chain);
     const std::string& className = chain.front()->name;
     if (declared.empty() || path.getKeys().size() != declared.size()) {
         refuse(className + " has " + std::to_string(declared.size()) + " keys, not " +
@@ -61,7 +69,7 @@ CimPath typedKeys(const CimPath& path, const ClassChain& chain, const ClassLooku
     for (const CimKey& key : path.getKeys()) {
         // CIM-XML lets a class's one key come without its name (DSP0201, KEYVALUE without KEYBINDING).
         const bool isOnlyKey = key.name.empty() && declared.size() == 1;
-        const PropertyDeclaration* found = isOnlyKey ? &declared.front() : findByName(declared, key.name);
+        const PropertyDeclaration* found = isOnlyKey ? declared.front() : findKey(declared, key.name);
         if (found == nullptr) refuse(className + " has no key " + key.name);
         if (findByName(keys, found->name) != nullptr) refuse("key " + found->name + " is given twice");
         keys.push_back({found->name, typedKey(*found, key.value, classes)});
@@ -114,7 +122,8 @@ std::optional<CimValue> typedValue(const ParameterDeclaration& declared, const A
     const CimScalar* single = given.value.scalar();
     if (single == nullptr && !declared.isArray) return std::nullopt;
     std::vector<CimScalar> typed;
-    for (const CimScalar& each : single == nullptr ? *given.value.elements() : std::vector{*single}) {
+    for (const CimScalar& each :
+         single == nullptr ? std::span(*given.value.elements()) : std::span(single, 1)) {
         auto value = typedElement(declared.type, each, given);
         if (!value) return std::nullopt;
         if (auto* path = std::get_if<CimPath>(&*value)) *path = typedReference(*path, classes);
