@@ -68,6 +68,10 @@ int main(int argc, char** argv) {
         const pid_t child = fork();
         if (child == 0) {
             alarm(kHangsAfterSeconds);
+            dlclose(providers[1]);
+            report();
+            load(argv[2]);
+            report();
             exit(0);
         }
         waitpid(child, &status, 0);

@@ -175,7 +175,7 @@ TEST(HostOfCTest, UnloadsEitherProviderFirstWhileFlashesFailAndRequestsAreRefuse
     }
 }
 
-TEST(HostOfCTest, EndsWithItsLastThreadAndLetsAChildEndAtOnce) {
+TEST(HostOfCTest, EndsWithItsLastThreadAndLetsAChildUnloadAndEnd) {
     if (__has_feature(thread_sanitizer)) GTEST_SKIP() << "the thread sanitizer has a thread that never ends";
     const test::TempFolder folder;
     folder.write("adapters.toml", kAdapter + R"(
@@ -185,7 +185,9 @@ TEST(HostOfCTest, EndsWithItsLastThreadAndLetsAChildEndAtOnce) {
         milliseconds = 300
         )");
     std::uint16_t revision = 1;
-    for (const auto& [use, said] : {std::pair("leave", ""), std::pair("fork", "child: 0\n")}) {
+    for (const auto& [use, said] : {std::pair("leave", ""), std::pair("fork",
+                                                                      "1 agents, mapped: 1 0\n"
+                                                                      "2 agents, mapped: 1 1\nchild: 0\n")}) {
         const auto rom = test::madeRom({{FirmwareType::PXE, ++revision}, {FirmwareType::UEFI, 1}});
         EXPECT_EQ(
             outputOf({"env", "QUENX_ADAPTERS=" + folder / "adapters.toml",

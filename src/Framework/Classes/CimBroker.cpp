@@ -43,6 +43,7 @@ void CimAgent::disableIndications(std::string className) {
 
 void CimAgent::leaveBroker() noexcept {
     if (m_forks != os::forkCount() && !GetCimBroker()->isUsedHere()) {
+        GetCimBroker()->forgetAgent(this);
         m_classes.abandon();
         return;
     }
@@ -74,6 +75,10 @@ void CimBroker::removeAgent(CimAgent* agent) noexcept {
     // Outside the lock: the requests waited for may ask the broker themselves.
     for (int users = leaving->users; users != 0; users = leaving->users)
         leaving->users.wait(users);
+}
+
+void CimBroker::forgetAgent(const CimAgent* agent) noexcept QUENX_NO_THREAD_SAFETY_ANALYSIS {
+    std::erase_if(m_agents, [&](const auto& each) { return each->agent == agent; });
 }
 
 bool CimBroker::isUsedHere() const noexcept {

@@ -33,8 +33,8 @@ class QUENX_EXPORT CimAgent {
     /// Takes the agent out of the broker, waits for the requests that use it, destroys its class objects and
     /// waits until every released instance is destroyed, so that its library can be unloaded. The most
     /// derived destructor calls it, before anything of the object is gone. Must not be called from within a
-    /// request. A child of the process that built the agent, and which has not used any, leaves everything as
-    /// it is: the threads to wait for are not there, and locks may be held for ever.
+    /// request. A child of the process that built the agent, and which has not used any, only takes it out:
+    /// the threads to wait for are not there, and locks may be held for ever.
     void leaveBroker() noexcept;
 
     CimClasses m_classes;
@@ -65,6 +65,10 @@ class QUENX_EXPORT CimBroker {
 
     /// Takes the agent out and waits until nobody uses it. An agent that is not registered is ignored.
     void removeAgent(CimAgent* agent) noexcept;
+
+    /// Takes the agent out, without a lock or a wait: for a child of the process that added it, where a
+    /// thread that is not there may hold the lock. Nobody else may use the broker meanwhile.
+    void forgetAgent(const CimAgent* agent) noexcept;
 
     /// Whether this process has used an agent. A child of one that has, has not yet.
     bool isUsedHere() const noexcept;

@@ -65,7 +65,15 @@ std::vector<const ServedClass*> CimClasses::getAll() const {
 void CimClasses::abandon() noexcept QUENX_NO_THREAD_SAFETY_ANALYSIS {
     // In a list that is never destroyed, and that leak checkers find.
     static auto& abandoned = *new std::vector<std::unique_ptr<ServedClass>>;
-    abandoned.swap(m_served);
+    for (auto& served : m_served) {
+        try {
+            abandoned.push_back(nullptr);
+            abandoned.back() = std::move(served);
+        } catch (...) {
+            static_cast<void>(served.release());
+        }
+    }
+    m_served.clear();
 }
 
 void CimClasses::clear() {

@@ -123,9 +123,15 @@ class InstanceReaper {
         const utils::Thread::Waiting waiting;
         std::unique_lock lock(m_mutex);
         if (!isOfThisProcess() && m_first == nullptr) return;
-        // Without a thread the caller does the work, since it must not go on before it is done.
-        if (m_first != nullptr && !startThread()) destroyQueued(lock);
-        m_changed.wait(lock, [this] { return m_first == nullptr && m_busy == 0; });
+        while (m_first != nullptr || m_busy != 0) {
+            // Without a thread the caller does the work, since it must not go on before it is done. The
+            // thread that was there may have ended meanwhile.
+            if (m_first != nullptr && !startThread()) {
+                destroyQueued(lock);
+            } else {
+                m_changed.wait(lock);
+            }
+        }
     }
 
   private:
@@ -133,11 +139,15 @@ class InstanceReaper {
 
     /// Under the lock. False when the system refuses a thread, or one is not wanted.
     bool startThread() noexcept {
-        if (isOfThisProcess() && m_isRunning) return true;
+        if (!isOfThisProcess()) {
+            // The parent's thread is not here, whatever it was doing.
+            m_forks = os::forkCount();
+            m_isRunning = m_isJoinable = false;
+            m_busy = 0;
+        }
+        if (m_isRunning) return true;
         if (m_bans != 0) return false;
         forgetThread();
-        if (!isOfThisProcess()) m_busy = 0;
-        m_forks = os::forkCount();
         const utils::SignalsBlocked blocked;
         m_isRunning = pthread_create(&m_thread, nullptr, &InstanceReaper::run, this) == 0;
         m_isJoinable = m_isRunning;
