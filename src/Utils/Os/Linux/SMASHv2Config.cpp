@@ -41,6 +41,31 @@ bool isSkipped(const std::string& line) {
     return begin == std::string::npos || line[begin] == '#';
 }
 
+/// Hands each key to `take`, with the words that follow it. A file that cannot be read any further has ended;
+/// what else goes wrong is thrown.
+template <class Take>
+void readSettings(const std::string& path, Take take) {
+    std::ifstream file(path);
+    // A stream keeps exceptions to itself unless asked, and without memory the rest would go missing unsaid.
+    file.exceptions(std::ios::badbit);
+    try {
+        for (std::string line; std::getline(file, line);) {
+            if (isSkipped(line)) continue;
+            // Everywhere, values included: so "Key=value" and "Key = value" read alike.
+            replaceCharacter(line, '=', ' ');
+            std::istringstream words(line);
+            words.exceptions(std::ios::badbit);
+            // A host may have set a locale in which "1.000" is a number.
+            words.imbue(std::locale::classic());
+            std::string key;
+            words >> key;
+            take(key, words);
+        }
+    } catch (const std::ios::failure&) {
+        // A folder in its place, or a medium that fails: as good as no file.
+    }
+}
+
 /// Appends the directories of a list separated by ';' that exist.
 void addDirectories(const std::string& list, StringArray& directories) {
     for (const std::string& item : split(list, ';')) {
@@ -92,15 +117,11 @@ StringArray SMASHv2Config::getFirmwareFilesPaths() {
 }
 
 bool SMASHv2Config::getReleaseClaimAfterCheck() {
-    initialize();
-    Mutex::AutoLocker locker(m_mutex);
-    return m_releaseClaimAfterCheck;
+    return readOwnSettings().releaseClaimAfterCheck;
 }
 
 ImageLimits SMASHv2Config::getImageLimits() {
-    initialize();
-    Mutex::AutoLocker locker(m_mutex);
-    return m_imageLimits;
+    return readOwnSettings().imageLimits;
 }
 
 void SMASHv2Config::initialize() {
@@ -108,63 +129,62 @@ void SMASHv2Config::initialize() {
     try {
         // Built apart and put in place at the end: a pass that fails leaves the old list whole.
         StringArray directories;
-        std::ifstream file(m_path);
-        // A stream keeps exceptions to itself unless asked, and the rest of the file would go missing unsaid.
-        file.exceptions(std::ios::badbit);
-        for (std::string line; std::getline(file, line);) {
-            if (!isSkipped(line)) readLine(std::move(line), directories);
-        }
+        readSettings(m_path, [&](const std::string& key, std::istream& words) {
+            takeSetting(key, words, directories);
+        });
         m_firmwarePaths = std::move(directories);
     } catch (...) {
         QUENX_ERROR(" Reading configuration values from the config file - failed");
     }
 }
 
-void SMASHv2Config::readLine(std::string line, StringArray& directories) {
-    // Everywhere, values included: so "Key=value" and "Key = value" read alike.
-    replaceCharacter(line, '=', ' ');
-    std::istringstream words(line);
-    words.exceptions(std::ios::badbit);
-    // A host may have set a locale in which "1.000" is a number.
-    words.imbue(std::locale::classic());
-    std::string key;
-    words >> key;
+void SMASHv2Config::takeSetting(const std::string& key, std::istream& words, StringArray& directories) {
+    std::string word;
     if (key == SMASHv2_FWFILE_PATH_KEY) {
-        std::string list;
-        std::getline(words, list);
-        addDirectories(list, directories);
+        std::getline(words, word);
+        addDirectories(word, directories);
     } else if (key == SMASHv2_CUSTOMIZATION_KEY) {
         std::uint16_t value = 0;
         if (!(words >> value)) return;
         m_oemCustomization = value;
         formatDebugLog(__FILE__, kReadingFunction, __LINE__, "Read OEMCustomizeable : %d", value);
-    } else {
-        std::string word;
+    } else if (key == SMASHv2_NAMESPACE_KEY) {
         words >> word;
-        takeWord(key, std::move(word));
-    }
-}
-
-void SMASHv2Config::takeWord(const std::string& key, std::string word) {
-    if (key == SMASHv2_NAMESPACE_KEY && word.starts_with(kRootNamespace)) {
+        if (!word.starts_with(kRootNamespace)) return;
         m_namespace = std::move(word);
         formatDebugLog(__FILE__, kReadingFunction, __LINE__, "Read NameSpace : %s", m_namespace.c_str());
     } else if (key == SMASHv2_SEMAPHORE_TIMEOUT_KEY) {
+        words >> word;
         toUint(word, m_lockerTimeout);
         // Also after a refusal, with the value that stands.
         formatDebugLog(__FILE__, kReadingFunction, __LINE__, "Read LockerTimeout : %d",
                        static_cast<std::int32_t>(m_lockerTimeout));
-    } else if (key == kReleaseClaimKey && (word == "0" || word == "1")) {
-        m_releaseClaimAfterCheck = word == "1";
-        formatDebugLog(__FILE__, kReadingFunction, __LINE__, "Read ReleaseClaimAfterCheck : %d",
-                       m_releaseClaimAfterCheck);
-    } else if (key == kImageReadTimeoutKey) {
-        std::uint32_t seconds = 0;
-        if (!toUint(word, seconds) || seconds == 0 || seconds > kMaxImageReadTimeout) return;
-        m_imageLimits.silence = std::chrono::seconds(seconds);
-        formatDebugLog(__FILE__, kReadingFunction, __LINE__, "Read ImageReadTimeout : %u", seconds);
-    } else if (key == kLargestImageKey && toUint(word, m_imageLimits.largest)) {
-        formatDebugLog(__FILE__, kReadingFunction, __LINE__, "Read LargestImage : %u", m_imageLimits.largest);
+    }
+}
+
+SMASHv2Config::OwnSettings SMASHv2Config::readOwnSettings() {
+    Mutex::AutoLocker locker(m_mutex);
+    try {
+        readSettings(m_path, [&](const std::string& key, std::istream& words) {
+            std::string word;
+            words >> word;
+            takeOwnSetting(key, word);
+        });
+    } catch (...) {
+        QUENX_ERROR("%s cannot be read for want of memory; the settings of before stay", m_path.c_str());
+    }
+    return m_own;
+}
+
+void SMASHv2Config::takeOwnSetting(const std::string& key, const std::string& word) {
+    std::uint32_t seconds = 0;
+    if (key == kReleaseClaimKey && (word == "0" || word == "1")) {
+        m_own.releaseClaimAfterCheck = word == "1";
+    } else if (key == kImageReadTimeoutKey && toUint(word, seconds) && seconds != 0 &&
+               seconds <= kMaxImageReadTimeout) {
+        m_own.imageLimits.silence = std::chrono::seconds(seconds);
+    } else if (key == kLargestImageKey) {
+        toUint(word, m_own.imageLimits.largest);
     }
 }
 

@@ -3,6 +3,7 @@
 
 #include <chrono>
 #include <cstdint>
+#include <istream>
 #include <memory>
 #include <string>
 
@@ -65,8 +66,17 @@ class QUENX_EXPORT SMASHv2Config : public AutoSingleton<SMASHv2Config> {
     static std::unique_ptr<SMASHv2Config> CreateSingleton();
 
   private:
-    void readLine(std::string line, StringArray& directories) QUENX_REQUIRES(m_mutex);
-    void takeWord(const std::string& key, std::string word) QUENX_REQUIRES(m_mutex);
+    /// What only this system knows. Read apart, since a look at these must not change what others keep, nor
+    /// wait for the directories of firmware files.
+    struct OwnSettings {
+        bool releaseClaimAfterCheck = false;
+        ImageLimits imageLimits;
+    };
+
+    void takeSetting(const std::string& key, std::istream& words, StringArray& directories)
+        QUENX_REQUIRES(m_mutex);
+    OwnSettings readOwnSettings();
+    void takeOwnSetting(const std::string& key, const std::string& word) QUENX_REQUIRES(m_mutex);
 
     Mutex m_mutex;
     std::uint16_t m_oemCustomization QUENX_GUARDED_BY(m_mutex) = 0;
@@ -75,8 +85,7 @@ class QUENX_EXPORT SMASHv2Config : public AutoSingleton<SMASHv2Config> {
     std::uint32_t m_lockerTimeout QUENX_GUARDED_BY(m_mutex) = 300000;
     bool m_downgradeBlocked QUENX_GUARDED_BY(m_mutex) = false;
     StringArray m_firmwarePaths QUENX_GUARDED_BY(m_mutex);
-    bool m_releaseClaimAfterCheck QUENX_GUARDED_BY(m_mutex) = false;
-    ImageLimits m_imageLimits QUENX_GUARDED_BY(m_mutex);
+    OwnSettings m_own QUENX_GUARDED_BY(m_mutex);
 };
 
 extern template class Singleton<SMASHv2Config>;

@@ -45,7 +45,7 @@ TEST_F(SMASHv2ConfigTest, ReadsAndLogsEachLine) {
         {"Timeout=0x100000000", "root/cimv2", 300000, "Read LockerTimeout : 300000"},
         {"OEMCustomizeable=4x", "root/cimv2", 300000, "Read OEMCustomizeable : 4"},
         {"OEMCustomizeable=65536", "root/cimv2", 300000, nullptr},
-        {"ReleaseClaimAfterCheck=1", "root/cimv2", 300000, "Read ReleaseClaimAfterCheck : 1"},
+        {"ReleaseClaimAfterCheck=1", "root/cimv2", 300000, nullptr},
         {"ReleaseClaimAfterCheck=2", "root/cimv2", 300000, nullptr},
     };
     for (const auto& row : rows) {
@@ -75,7 +75,14 @@ TEST_F(SMASHv2ConfigTest, IsThatOfTheSystemUnlessThereIsAnother) {
 TEST_F(SMASHv2ConfigTest, KeepsTheValueOfARemovedKeyAndTheBanOnDowngrades) {
     EXPECT_TRUE(config.isDowngradeEnabled());  // no file yet
     write("Namespace=root/a\nOEMCustomizeable=5\nReleaseClaimAfterCheck=1\n");
+    // A look at what only this system knows is not a look at the rest.
+    SyslogCapture::clear();
     EXPECT_TRUE(config.getReleaseClaimAfterCheck());
+    EXPECT_EQ(SyslogCapture::messages(), Lines{});
+    write("ReleaseClaimAfterCheck=1\n");
+    EXPECT_EQ(config.getNamespace(), "root/cimv2");
+    write("Namespace=root/a\nOEMCustomizeable=5\n");
+    config.initialize();
     write("");
     EXPECT_EQ(config.getNamespace(), "root/a");
     EXPECT_TRUE(config.getReleaseClaimAfterCheck());
@@ -83,6 +90,12 @@ TEST_F(SMASHv2ConfigTest, KeepsTheValueOfARemovedKeyAndTheBanOnDowngrades) {
     write("OEMCustomizeable=4\nReleaseClaimAfterCheck=0\n");
     EXPECT_FALSE(config.isDowngradeEnabled());
     EXPECT_FALSE(config.getReleaseClaimAfterCheck());
+    // A folder in its place is as good as no file.
+    std::filesystem::remove(folder / "conf");
+    mkdir((folder / "conf").c_str(), 0700);
+    SyslogCapture::clear();
+    EXPECT_FALSE(config.isDowngradeEnabled());
+    EXPECT_EQ(SyslogCapture::messages(), Lines{});
 }
 
 TEST_F(SMASHv2ConfigTest, BoundsTheReadingOfImages) {
