@@ -57,10 +57,14 @@ bool Uri::IsUriSupported() const {
 }
 
 bool Uri::IsUriAccesible() const {
+    if (!IsUriSupported()) return false;
     // Opened, not only looked at: a file that the service may not read is not accessible.
-    os::Patience patience;
-    return IsUriSupported() &&
-           IsUriAccesible(os::lookAtFile(m_sourcePath, -1, patience).value_or(os::FileLook()));
+    try {
+        os::Patience patience;
+        return IsUriAccesible(os::lookAtFile(m_sourcePath, -1, patience).value_or(os::FileLook()));
+    } catch (...) {
+        return false;
+    }
 }
 
 bool Uri::IsUriAccesible(const os::FileLook& look) const {

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 // The file system of the image stops answering.
 #include <condition_variable>
+#include <filesystem>
 #include <mutex>
 #include <thread>
 
@@ -81,6 +82,17 @@ TEST_F(HungFileTest, EndsTheUpdateAsAReadErrorAndLetsOthersGoOn) {
         deleteJobs();
         test::count("images on a file system that hung");
     }
+}
+
+TEST_F(HungFileTest, KnowsOneFileFromAnotherBehindALink) {
+    m_folder.write("quenx.conf", "ImageReadTimeout=1\n");
+    std::filesystem::create_directories(m_folder / "away/below");
+    std::filesystem::create_directory_symlink("away/below", m_folder / "link");
+    const std::string name = std::filesystem::path(m_path).filename();
+    m_folder.write("away/" + name, test::readTestFile(m_path));
+    const HungFileSystem files(m_path, 1);
+    EXPECT_EQ(install(m_uri, "eth0").returnValue, 2U);
+    EXPECT_EQ(install("file://" + (m_folder / "link/../") + name, "eth0").returnValue, 4096U);
 }
 
 TEST_F(HungFileTest, ReadsNoImageThatIsLargerThanAllowed) {

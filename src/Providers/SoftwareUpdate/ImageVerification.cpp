@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Providers/SoftwareUpdate/ImageVerification.h"
 
+#include <algorithm>
+#include <new>
 #include <optional>
 
 #include "MidAPI/ma.h"
@@ -112,6 +114,7 @@ class ImageFile {
     }
 
     Buffer takeBytes() {
+        if (m_file.isWithoutMemory) throw std::bad_alloc();
         // The file may have shrunk since it was measured.
         if (m_file.count != static_cast<std::size_t>(m_file.size)) refuse();
         return std::move(m_file.bytes);
@@ -122,12 +125,23 @@ class ImageFile {
         throw EImageReadError(utils::formatStr("Image read error: %s (%s)", m_uri.c_str(), m_path.c_str()));
     }
     os::FileLook look() const {
+        constexpr std::uint32_t kLargest = INT32_MAX;
         os::Patience patience(m_limits.silence);
-        std::optional<os::FileLook> found =
-            os::lookAtFile(m_path, m_limits.largest != 0 ? m_limits.largest : INT32_MAX, patience);
-        if (found) return std::move(*found);
-        QUENX_ERROR("%s is not read: its file system did not answer for %d seconds, now or earlier",
-                    m_path.c_str(), static_cast<int>(m_limits.silence.count()));
+        try {
+            std::optional<os::FileLook> found = os::lookAtFile(
+                m_path, m_limits.largest != 0 ? std::min(m_limits.largest, kLargest) : kLargest, patience);
+            if (found) return std::move(*found);
+        } catch (const std::bad_alloc&) {
+            // Whoever cannot ask for the file does not know of it.
+            return {};
+        }
+        if (patience.hungFiles != 0) {
+            QUENX_ERROR("%s is not read: %u other files are on file systems that do not answer",
+                        m_path.c_str(), patience.hungFiles);
+        } else {
+            QUENX_ERROR("%s is not read: its file system did not answer for %d seconds, now or earlier",
+                        m_path.c_str(), static_cast<int>(m_limits.silence.count()));
+        }
         refuse();
     }
 

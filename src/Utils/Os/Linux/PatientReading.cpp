@@ -27,15 +27,15 @@ using std::chrono::milliseconds;
 constexpr std::size_t kStep = std::size_t{64} * 1024;
 constexpr milliseconds kFree(1000);  // a slow medium is not a silent one
 constexpr milliseconds kLook(100);   // between two looks at a reader that works
-constexpr unsigned int kMaxLeftBehind = 16;
+constexpr unsigned int kMaxLeftBehind = 64;
 
 /// One file, looked at and perhaps read on a thread of its own.
 struct Reading {
     std::string path;
-    std::string key;        ///< one for all spellings of the path
+    std::string key;        ///< one for "/a", "//a" and "/./a"
     std::int64_t most = 0;  ///< a larger file is not read
     FileLook found{};
-    bool isWithoutMemory = false;
+    int error = 0;  ///< errno of what failed
     std::atomic<std::uint64_t> steps = 0;
     bool isDone = false;
     bool isLeftBehind = false;
@@ -68,6 +68,15 @@ struct Readings {
     }
 };
 
+/// The path without empty and "." parts. Those with ".." stay: what they lead to depends on links.
+std::string keyOf(const std::string& path) {
+    std::string key = path.starts_with('/') ? "" : ".";
+    for (const auto& part : std::filesystem::path(path)) {
+        if (!part.empty() && part != "." && part != "/") key += '/' + part.string();
+    }
+    return key;
+}
+
 void reached(Reading& reading) {
     ++reading.steps;
     if (const auto test = beforeFileAccess.load()) test(reading.path);
@@ -83,8 +92,8 @@ void readFrom(int file, Reading& reading) {
     FileLook& found = reading.found;
     const auto size = static_cast<std::size_t>(found.size);
     found.bytes.reset(new (std::nothrow) std::uint8_t[size]);
-    reading.isWithoutMemory = found.bytes == nullptr;
-    while (!reading.isWithoutMemory && found.count < size) {
+    found.isWithoutMemory = found.bytes == nullptr;
+    while (!found.isWithoutMemory && found.count < size) {
         reached(reading);
         const ssize_t got =
             ::read(file, found.bytes.get() + found.count, std::min(kStep, size - found.count));
@@ -94,17 +103,28 @@ void readFrom(int file, Reading& reading) {
     }
 }
 
+int openForReading(const std::string& path) {
+    constexpr int kFlags = O_RDONLY | O_CLOEXEC | O_NOCTTY;
+    // A FIFO that took the file's place after the look at it must not block the opening.
+    const int file = ::open(path.c_str(), kFlags | O_NONBLOCK);
+    // Somebody has a lease on the file, which the kernel takes back while this waits.
+    return file < 0 && errno == EWOULDBLOCK ? ::open(path.c_str(), kFlags) : file;
+}
+
 void carryOut(Reading& reading) {
     struct stat status {};
     // A path with a NUL in it names nothing, and must not open what its head names.
     if (reading.path.find('\0') != std::string::npos) return;
     reached(reading);
     // Told before the opening: to open a device can rewind a tape or reset a modem.
-    if (::stat(reading.path.c_str(), &status) != 0) return;
+    if (::stat(reading.path.c_str(), &status) != 0) {
+        reading.error = errno;
+        return;
+    }
     if (kindOf(status) == FileKind::CannotBeOpened) return;
     reached(reading);
-    // A FIFO that took the file's place after the look at it must not block the opening.
-    const Descriptor file(::open(reading.path.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK | O_NOCTTY));
+    const Descriptor file(openForReading(reading.path));
+    if (file.number() < 0) reading.error = errno;
     // A process without standard input gets number 0 here, and counts as one that cannot open files.
     if (file.number() <= 0) return;
     const bool isKnown = ::fstat(file.number(), &status) == 0;
@@ -159,7 +179,8 @@ bool carryOutPatiently(std::unique_ptr<Reading>& reading, Patience& patience) {
     const bool isFree = waitFor(
         lock, patience, [&] { return other() == nullptr || other()->isLeftBehind; },
         [&] { return other() == nullptr ? 0 : other()->steps.load(); });
-    patience.isOver = !isFree || other() != nullptr || readings.leftBehind >= kMaxLeftBehind;
+    if (readings.leftBehind >= kMaxLeftBehind) patience.hungFiles = readings.leftBehind;
+    patience.isOver = !isFree || other() != nullptr || patience.hungFiles != 0;
     if (patience.isOver) return false;
     pthread_t thread{};
     if (const utils::SignalsBlocked blocked;
@@ -193,10 +214,11 @@ std::atomic<void (*)(const std::string& path)> beforeFileAccess = nullptr;
 std::optional<FileLook> lookAtFile(const std::string& path, std::int64_t most, Patience& patience) {
     auto reading = std::make_unique<Reading>();
     reading->path = path;
-    reading->key = std::filesystem::path(path).lexically_normal();
+    reading->key = keyOf(path);
     reading->most = most;
     if (!carryOutPatiently(reading, patience)) return std::nullopt;
-    if (reading->isWithoutMemory) throw std::bad_alloc();
+    // As if it had been opened here: who logs the failure may ask for it.
+    if (reading->error != 0) errno = reading->error;
     return std::move(reading->found);
 }
 

@@ -25,6 +25,7 @@ struct Patience {
     const std::chrono::milliseconds silence;
     std::chrono::milliseconds left;  ///< for all silences of more than a second together
     bool isOver = false;             ///< a file was given up, in this request or an earlier one
+    unsigned int hungFiles = 0;      ///< if they were too many to begin another one
 };
 
 enum class FileKind { Regular, Directory, CannotBeOpened, CannotBeLookedAt };
@@ -34,15 +35,16 @@ struct FileLook {
     FileKind kind = FileKind::CannotBeOpened;
     std::int64_t size = 0;  ///< of a regular file, when it was opened
     std::unique_ptr<std::uint8_t[]> bytes;
-    std::size_t count = 0;  ///< how many could be read; fewer than `size` if the file shrank
+    std::size_t count = 0;         ///< how many could be read; fewer than `size` if the file shrank
+    bool isWithoutMemory = false;  ///< there was no room for `size` bytes
 };
 
 /// Opens what the path names, once, and reads a regular file of at most `most` bytes whole. Only regular
 /// files and directories are opened: a FIFO never blocks, and a device is not touched. Nothing when the file
 /// was given up; then `patience` is over, and further calls for this path answer so at once until the one
-/// that hangs has come back.
+/// that hangs has come back. errno tells why a file cannot be opened.
 /// @param most  a larger file is not read; -1 reads none
-/// @throws std::bad_alloc
+/// @throws std::bad_alloc  before the file is touched
 QUENX_EXPORT std::optional<FileLook> lookAtFile(const std::string& path, std::int64_t most,
                                                 Patience& patience);
 
