@@ -128,23 +128,29 @@ void addImageVerbs(CLI::App& app, Arguments& arguments) {
     verb->footer("An update that has begun always runs to its end: Ctrl-C does not stop it.");
 }
 
+/// A verb that looks around an instance. Whatever its result, the list can be of paths alone.
+CLI::App* addWalk(CLI::App& app, Arguments& arguments, const char* name, Verb run, const char* description) {
+    VerbOptions& options = arguments.options;
+    CLI::App* verb = addVerb(app, arguments, name, run, description);
+    addValue(*verb, "path", options.path, "PATH", "Object path, as \"instances CLASS --names\" prints it")
+        ->required();
+    addValue(*verb, "--class", options.filter.associationClass, "CLASS", "Only associations of this class");
+    addValue(*verb, "--role", options.filter.role, "ROLE", "Only where the instance has this role");
+    verb->add_flag("--names", options.namesOnly, "Only their object paths");
+    return verb;
+}
+
 void addModelVerbs(CLI::App& app, Arguments& arguments) {
     VerbOptions& options = arguments.options;
     CLI::App* verb = addVerb(app, arguments, "instances", showInstances, "List the instances of a class");
     addValue(*verb, "class", options.className, "CLASS", "Class, for example Quenx_ConcreteJob")->required();
     verb->add_flag("--names", options.namesOnly, "Only their object paths");
 
-    verb = addVerb(app, arguments, "associators", showAssociators,
+    verb = addWalk(app, arguments, "associators", showAssociators,
                    "List the instances associated with an instance");
-    addValue(*verb, "path", options.path, "PATH", "Object path, as \"instances CLASS --names\" prints it")
-        ->required();
-    addValue(*verb, "--class", options.filter.associationClass, "CLASS",
-             "Only through associations of this class");
     addValue(*verb, "--result-class", options.filter.resultClass, "CLASS", "Only instances of this class");
-    addValue(*verb, "--role", options.filter.role, "ROLE", "Only where the instance has this role");
     addValue(*verb, "--result-role", options.filter.resultRole, "ROLE", "Only instances with this role");
-    verb->add_flag("--names", options.namesOnly, "Only their object paths");
-
+    addWalk(app, arguments, "references", showReferences, "List the associations of an instance");
     addVerb(app, arguments, "mof", showMof, "Print the schema of all served classes as MOF");
 }
 

@@ -52,6 +52,28 @@ void refuseUnknownClass(core::CimOperations& operations, const std::string& name
     if (!name.empty() && operations.getClass(name).empty()) refuseClass(operations, name);
 }
 
+/// What two operations find around an instance, the one as instances and the other as paths.
+template <class List, class ListNames>
+ExitStatus showAround(Context& context, const VerbOptions& options, List list, ListNames listNames) {
+    core::CimOperations& operations = *context.connection.operations;
+    const core::CimPath path(options.path);
+    if (!path.isInstancePath()) {
+        throw CommandError(ExitStatus::WrongUse, "\"" + options.path + "\" is not the path of an instance.",
+                           "Give one as \"quenxctl instances CLASS --names\" prints it, in single quotes.");
+    }
+    try {
+        return options.namesOnly ? print(context, (operations.*listNames)(path, options.filter))
+                                 : print(context, (operations.*list)(path, options.filter, std::nullopt));
+    } catch (const core::CimError& error) {
+        // To the operation an unknown class of the filter is a wrong parameter like any other.
+        if (error.status() == core::CimStatus::InvalidParameter) {
+            refuseUnknownClass(operations, options.filter.associationClass);
+            refuseUnknownClass(operations, options.filter.resultClass);
+        }
+        throw;
+    }
+}
+
 }  // namespace
 
 ExitStatus showAdapters(Context& context, const VerbOptions&) {
@@ -110,23 +132,13 @@ ExitStatus showInstances(Context& context, const VerbOptions& options) try {
 }
 
 ExitStatus showAssociators(Context& context, const VerbOptions& options) {
-    core::CimOperations& operations = *context.connection.operations;
-    const core::CimPath path(options.path);
-    if (!path.isInstancePath()) {
-        throw CommandError(ExitStatus::WrongUse, "\"" + options.path + "\" is not the path of an instance.",
-                           "Give one as \"quenxctl instances CLASS --names\" prints it, in single quotes.");
-    }
-    try {
-        return options.namesOnly ? print(context, operations.associatorNames(path, options.filter))
-                                 : print(context, operations.associators(path, options.filter));
-    } catch (const core::CimError& error) {
-        // To the operation an unknown class of the filter is a wrong parameter like any other.
-        if (error.status() == core::CimStatus::InvalidParameter) {
-            refuseUnknownClass(operations, options.filter.associationClass);
-            refuseUnknownClass(operations, options.filter.resultClass);
-        }
-        throw;
-    }
+    using core::CimOperations;
+    return showAround(context, options, &CimOperations::associators, &CimOperations::associatorNames);
+}
+
+ExitStatus showReferences(Context& context, const VerbOptions& options) {
+    using core::CimOperations;
+    return showAround(context, options, &CimOperations::references, &CimOperations::referenceNames);
 }
 
 }  // namespace cli

@@ -29,9 +29,9 @@ struct VerbOptions {
     UpdateOptions update;            ///< install, check
     std::string job;                 ///< delete: its id, the number at the end of that, or its path
     std::string className;           ///< instances
-    std::string path;                ///< associators
-    core::AssociationFilter filter;  ///< associators
-    bool namesOnly = false;          ///< instances, associators
+    std::string path;                ///< associators, references
+    core::AssociationFilter filter;  ///< associators, references
+    bool namesOnly = false;          ///< instances, associators, references
 };
 
 using Verb = ExitStatus (*)(Context& context, const VerbOptions& options);
@@ -49,6 +49,7 @@ ExitStatus deleteJob(Context& context, const VerbOptions& options);
 
 ExitStatus showInstances(Context& context, const VerbOptions& options);
 ExitStatus showAssociators(Context& context, const VerbOptions& options);
+ExitStatus showReferences(Context& context, const VerbOptions& options);
 /// The classes as MOF (DSP0004 annex A) in an order that a compiler takes: the declarations of the qualifiers
 /// first, then each class after its superclass and after the classes that it refers to, as far as those do
 /// not refer to each other.
