@@ -12,22 +12,18 @@ namespace {
 
 using namespace std::string_literals;
 using cimxml::checkWellFormed;
+using cimxml::WireError;
 
-TEST(XmlGuardTest, AcceptsWellFormedDocuments) {
-    EXPECT_NO_THROW(
-        checkWellFormed("\xEF\xBB\xBF<?xml version='1.0' encoding=\"UTF-8\" standalone='yes'?>\n<a/>"));
-    EXPECT_NO_THROW(
-        checkWellFormed("<a b='1' c=\"&lt;'\"><d >x &amp; &#x41; &#x10FFFF; ]] ></d ><![CDATA[<&]]></a>"));
-    EXPECT_NO_THROW(
-        checkWellFormed("<a>gr\xC3\xBC\xE2\x82\xAC\xF0\x9F\x98\x80\t\r\n</a>\n<!-- end --><?p x?>"));
-}
-
-TEST(XmlGuardTest, RefusesWhatIsNotWellFormed) {
-    for (const char* bad : {"", "<a>", "<a></b>", "<a/><b/>", "text<a/>", "<1a/>", "<![CDATA[x]]><a/>",
-                            "<!DOCTYPE a><a/>", " <?xml version='1.0'?><a/>"})
-        EXPECT_THROW(checkWellFormed(bad), cimxml::WireError) << bad;
-    EXPECT_THROW(checkWellFormed("<?xml version='1.0' encoding='utf-16'?><a/>"), cimxml::WireError);
-    EXPECT_THROW(checkWellFormed("<!DOCTYPE a [<!ENTITY x 'y'>]><a>&x;</a>"), cimxml::WireError);
+TEST(XmlGuardTest, TellsWhatIsWellFormed) {
+    for (const char* good : {"\xEF\xBB\xBF<?xml version='1.0' encoding=\"UTF-8\" standalone='yes'?>\n<a/>",
+                             "<a b='1' c=\"&lt;'\"><d >x &amp; &#x41; &#x10FFFF; ]] ></d ><![CDATA[<&]]></a>",
+                             "<a>gr\xC3\xBC\xE2\x82\xAC\xF0\x9F\x98\x80\t\r\n</a>\n<!-- end --><?p x?>"})
+        EXPECT_NO_THROW(checkWellFormed(good)) << good;
+    for (const char* bad :
+         {"", "<a>", "<a></b>", "<a/><b/>", "text<a/>", "<1a/>", "<![CDATA[x]]><a/>", "<!DOCTYPE a><a/>",
+          " <?xml version='1.0'?><a/>", "<?xml version='1.0' encoding='utf-16'?><a/>",
+          "<!DOCTYPE a [<!ENTITY x 'y'>]><a>&x;</a>"})
+        EXPECT_THROW(checkWellFormed(bad), WireError) << bad;
     const std::string inside[] = {
         "<b c=1/>", "<b c='1' c='2'/>", "<b c='<'/>", "<b c='1/>", "<b c='&no;'/>", "<!ELEMENT b>",
         "<!-- -- -->", "<!-- ", "]]>", "&", "&unknown;", "&amp", "&#0;", "&#;", "&#-65;", "&#xD800;",
@@ -36,7 +32,7 @@ TEST(XmlGuardTest, RefusesWhatIsNotWellFormed) {
         "\0"s, "\x01", "\x80", "\xC0\x80", "\xE0\x80\xAF", "\xED\xA0\x80", "\xF4\x90\x80\x80", "\xE2\x82",
         "\xEF\xBF\xBE"};
     for (const std::string& bad : inside)
-        EXPECT_THROW(checkWellFormed("<a>" + bad + "</a>"), cimxml::WireError) << bad;
+        EXPECT_THROW(checkWellFormed("<a>" + bad + "</a>"), WireError) << bad;
 }
 
 TEST(XmlGuardTest, KeepsTheLimits) {
@@ -47,21 +43,19 @@ TEST(XmlGuardTest, KeepsTheLimits) {
         return text;
     };
     EXPECT_NO_THROW(checkWellFormed(nested(64)));
-    EXPECT_THROW(checkWellFormed(nested(65)), cimxml::WireError);
-    EXPECT_THROW(checkWellFormed(nested(1000)), cimxml::WireError);
+    EXPECT_THROW(checkWellFormed(nested(65)), WireError);
     EXPECT_NO_THROW(checkWellFormed("<a><b/><b/></a>", {.elements = 3}));
-    EXPECT_THROW(checkWellFormed("<a><b/><b/><b/></a>", {.elements = 3}), cimxml::WireError);
+    EXPECT_THROW(checkWellFormed("<a><b/><b/><b/></a>", {.elements = 3}), WireError);
     EXPECT_NO_THROW(checkWellFormed("<a b='' c=''/>", {.attributes = 2}));
-    EXPECT_THROW(checkWellFormed("<a b='' c='' d=''/>", {.attributes = 2}), cimxml::WireError);
-}
-
-std::string escaped(const std::string& text) {
-    std::string out;
-    cimxml::appendEscaped(out, text);
-    return out;
+    EXPECT_THROW(checkWellFormed("<a b='' c='' d=''/>", {.attributes = 2}), WireError);
 }
 
 TEST(XmlTextTest, AnyBytesBecomeTextThatIsAccepted) {
+    const auto escaped = [](const std::string& text) {
+        std::string out;
+        cimxml::appendEscaped(out, text);
+        return out;
+    };
     EXPECT_EQ(escaped("a<b>&\"c' \t\r\n"), "a&lt;b&gt;&amp;&quot;c' \t\r\n");
     EXPECT_EQ(escaped("\0\x01x\x1Fy\x7F"s), "xy\x7F");
     EXPECT_EQ(escaped("\xC3\xBC\xF0\x9F\x98\x80"), "\xC3\xBC\xF0\x9F\x98\x80");

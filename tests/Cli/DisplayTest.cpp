@@ -28,11 +28,7 @@ TEST(ImageUriTest, LeavesUrisAloneAndEncodesNothing) {
 }
 
 TEST(OutputTest, WritesValuesAsTextAndAsJson) {
-    const struct {
-        CimValue value;
-        std::string text;
-        std::string json;
-    } rows[] = {
+    const std::tuple<CimValue, const char*, const char*> table[] = {
         {CimValue::null(CimType::String), "NULL", "null"},
         {CimValue::of(CimType::Boolean, true), "TRUE", "true"},
         {CimValue::of(CimType::Uint64, std::uint64_t{18446744073709551615U}), "18446744073709551615",
@@ -42,9 +38,9 @@ TEST(OutputTest, WritesValuesAsTextAndAsJson) {
         {CimValue::arrayOf(CimType::Uint16, {std::uint64_t{5}, std::uint64_t{3}}), "{5, 3}", "[5,3]"},
         {CimValue::arrayOf(CimType::String, {}), "{}", "[]"},
     };
-    for (const auto& row : rows) {
-        EXPECT_EQ(cli::displayText(row.value), row.text);
-        EXPECT_EQ(cli::Json(row.value).dump(), row.json);
+    for (const auto& [value, text, json] : table) {
+        EXPECT_EQ(cli::displayText(value), text);
+        EXPECT_EQ(cli::Json(value).dump(), json);
     }
     std::ostringstream out;
     cli::printJson(out, {{"name", "no text \xff"}});

@@ -86,6 +86,25 @@ class LoopbackServer {
     std::thread m_thread;
 };
 
+TEST(ServerUrlTest, CompletesWhatIsLeftOut) {
+    ::setenv("QUENXCTL_SOCKET", "", 1);
+    const std::tuple<std::string, std::string, bool, bool> table[] = {
+        {"https://host", "https://host:5989/cimom", true, false},
+        {"https://localhost:1/x", "https://localhost:1/x", true, true},
+        {"http://127.9.0.1/", "http://127.9.0.1:5988/cimom", false, true},
+        {"http://128.0.0.1", "http://128.0.0.1:5988/cimom", false, false},
+        {"https://[::1]", "https://[::1]:5989/cimom", true, true},
+        {"unix:", "unix:/run/quenx-cimd/socket", false, true},
+        {"unix:/s", "unix:/s", false, true},
+    };
+    for (const auto& [given, whole, isEncrypted, isLoopback] : table) {
+        const cli::ServerUrl url(given);
+        EXPECT_EQ(url.text(), whole);
+        EXPECT_EQ(url.isEncrypted(), isEncrypted) << given;
+        EXPECT_EQ(url.isLoopback(), isLoopback) << given;
+    }
+}
+
 std::string message(const std::string& id, const std::string& content) {
     return "<MESSAGE ID='" + id + "' PROTOCOLVERSION='1.0'><SIMPLERSP>" + content + "</SIMPLERSP></MESSAGE>";
 }

@@ -2,8 +2,12 @@
 #pragma once
 
 #include <cstdlib>
+#include <string>
 
 #include "Utils/Log.h"
+
+/// What a program of the fuzzer does with an input. Each defines its own.
+void fuzz(const std::string& bytes);
 
 /// What must hold for every input: a finding of the fuzzer when it does not.
 inline void require(bool condition) {
@@ -14,5 +18,10 @@ inline void require(bool condition) {
 extern "C" int LLVMFuzzerInitialize(int*, char***) {
     utils::openLinuxLog();
     utils::logLevel = 0;
+    return 0;
+}
+
+extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
+    fuzz(std::string(data, data + size));
     return 0;
 }

@@ -2,16 +2,14 @@
 #include <sys/mman.h>
 #include <unistd.h>
 
-#include <string>
-
 #include "Fuzz/Fuzz.h"
 #include "Utils/Os/Linux/SMASHv2Config.h"
 #include "Utils/Os/Linux/linux.h"
 
-extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
+void fuzz(const std::string& bytes) {
     // A file without a disk behind it.
     const int file = memfd_create("fuzz.conf", 0);
-    require(write(file, data, size) == static_cast<ssize_t>(size));
+    require(write(file, bytes.data(), bytes.size()) == static_cast<ssize_t>(bytes.size()));
     utils::SMASHv2Config config("/proc/self/fd/" + std::to_string(file));
     const std::string name = config.getNamespace();
     require(name.starts_with("root") && name.find_first_of(" \t\n=") == std::string::npos);
@@ -26,5 +24,4 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
     require(config.getLockerTimeout() == timeout && config.getReleaseClaimAfterCheck() == releases);
     require(downgrades || !config.isDowngradeEnabled());
     close(file);
-    return 0;
 }

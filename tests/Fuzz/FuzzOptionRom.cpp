@@ -12,12 +12,12 @@ using Bytes = std::vector<uint8_t>;
 /// The first bytes of an input choose the requested types and what the adapter is and carries; the rest is
 /// the file.
 struct Input {
-    explicit Input(std::span<const uint8_t> data) {
+    explicit Input(std::string_view data) {
         const auto next = [&data] {
             if (data.empty()) return uint8_t{0};
-            const uint8_t byte = data.front();
-            data = data.subspan(1);
-            return byte;
+            const char byte = data.front();
+            data.remove_prefix(1);
+            return static_cast<uint8_t>(byte);
         };
         for (int count = next() % 4; count > 0; --count)
             requested.push_back(static_cast<utils::FirmwareType>(next() % 8 - 1));
@@ -46,8 +46,8 @@ void checkWriters(const Bytes& file, const ma::RomFile& rom) {
 
 }  // namespace
 
-extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
-    Input input({data, size});
+void fuzz(const std::string& bytes) {
+    Input input(bytes);
     const ma::RomFile rom = ma::parseOptionRom(input.file);
     require(rom.error || !rom.images.empty());
     if (!rom.error) checkWriters(input.file, rom);
@@ -68,5 +68,4 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
         const ma::RomFile made = ma::parseOptionRom(output);
         require(!made.error && made.images.size() == prepared.chosen.size());
     }
-    return 0;
 }

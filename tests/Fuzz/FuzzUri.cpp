@@ -1,12 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
-#include <string>
-
 #include "Fuzz/Fuzz.h"
 #include "Utils/Os/Linux/linux.h"
 #include "Utils/Uri.h"
 
-extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
-    const std::string text(data, data + size);
+void fuzz(const std::string& text) {
     utils::Uri uri(text);
     const bool hasScheme = uri.getScheme() != utils::Uri::SupportedURISchemes::Unknown;
     require(hasScheme || uri.getSourcePath().empty());
@@ -20,5 +17,4 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
     const std::string before = uri.getSourcePath();
     uri.parseUri("no scheme");
     require(uri.getSourcePath() == before && !uri.IsUriSupported());
-    return 0;
 }

@@ -15,8 +15,11 @@
 #include <thread>
 
 #include "Host/Authentication/ClientAddress.h"
+#include "Host/Operations/Dispatcher.h"
+#include "Host/Server/HttpServer.h"
 #include "Support/SyslogCapture.h"
 #include "Support/TempFolder.h"
+#include "System/RawConnection.h"
 
 namespace {
 
@@ -38,7 +41,9 @@ using namespace std::chrono_literals;
 using host::AuthenticationOutcome;
 using host::Credentials;
 using host::User;
+using ::testing::AllOf;
 using ::testing::HasSubstr;
+using ::testing::StartsWith;
 using ::testing::ThrowsMessage;
 
 TEST(UsersFileTest, ChecksPasswords) {
@@ -65,9 +70,24 @@ TEST(UsersFileTest, ChecksPasswords) {
     const std::clock_t known = std::max(cost({"admin", "guest"}), cost({"admin", ""}));
     EXPECT_GT(cost({"nobody", odd}) * 10, known);
     EXPECT_GT(cost({"", ""}) * 10, known);
+}
+
+TEST(UsersFileTest, CallsNoPasswordWrongForWantOfMemory) {
+    const test::TempFolder folder;
+    host::writeUsersFile(folder / "users", {{"admin", {host::hashPassword("admin"), true}}});
+    host::Authentication authentication(std::make_unique<host::UsersFile>(folder / "users"), 0s);
+    host::Dispatcher dispatcher(host::Dispatcher::Namespaces{});
+    host::HttpServer server({}, dispatcher, authentication);
+    const int port = server.listen("127.0.0.1", 0, false);
+    const auto answer = [&] {
+        const test::RawConnection client(port, "127.0.0.1");
+        client.send(test::httpRequest("no XML"));
+        return client.receive();
+    };
     isMemoryShort = true;
-    EXPECT_THROW(users.check({"guest", "guest"}, ""), host::CheckFailed) << "that is no wrong password";
+    EXPECT_THAT(answer(), AllOf(StartsWith("HTTP/1.1 503 "), HasSubstr("Retry-After: 10\r\n")));
     isMemoryShort = false;
+    EXPECT_THAT(answer(), AllOf(StartsWith("HTTP/1.1 400 "), HasSubstr("request-not-well-formed")));
 }
 
 TEST(UsersFileTest, SaysWhatIsWrongWithAFile) {

@@ -1,23 +1,26 @@
 // SPDX-License-Identifier: Apache-2.0
 #include <gmock/gmock.h>
 #include <gnutls/x509.h>
-#include <sys/stat.h>
-#include <unistd.h>
 
 #include <algorithm>
+#include <cstdlib>
 #include <ctime>
+#include <filesystem>
 #include <fstream>
 #include <thread>
 
 #include "Host/Authentication/PasswordChecker.h"
 #include "Host/Daemon/CommandLine.h"
 #include "Host/Daemon/Daemon.h"
+#include "Host/Daemon/Report.h"
 #include "Host/Daemon/SettingsField.h"
 #include "Host/Server/ServerCertificate.h"
+#include "Host/UnixSocket.h"
 #include "Support/TempFolder.h"
 
 namespace {
 
+namespace fs = std::filesystem;
 using host::Settings;
 using ::testing::AllOf;
 using ::testing::HasSubstr;
@@ -27,7 +30,6 @@ using Words = std::vector<std::string>;
 
 TEST(SettingsTest, NameTheMistakesInTheFile) {
     const test::TempFolder folder;
-    Settings settings;
     const std::pair<const char*, const char*> table[] = {
         {"[listen]\n\nhttps_port = 65536\n",
          ":3: listen.https_port is \"65536\". It must be a number from 0 to"},
@@ -44,6 +46,7 @@ TEST(SettingsTest, NameTheMistakesInTheFile) {
         {"[listen]\naddress = 127.0.0.1", ". A text must stand in quotes: address = \"127.0.0.1\""}};
     for (const auto& [content, expected] : table) {
         const std::string file = folder.write("bad", content);
+        Settings settings;
         EXPECT_THAT([&] { host::readSettingsFile(file, settings); },
                     ThrowsMessage<std::runtime_error>(AllOf(StartsWith(file), HasSubstr(expected))));
     }
@@ -187,9 +190,9 @@ TEST(ServerCertificateTest, IsRenewedOnlyIfMadeByAnUnsetClock) {
         EXPECT_TRUE(host::makeTlsFiles(files)) << unset;
         EXPECT_EQ(warning(), "");
     }
-    ::chmod(files.key.c_str(), 0640);
+    fs::permissions(files.key, fs::perms(0640));
     EXPECT_EQ(warning(), "");
-    ::chmod(files.key.c_str(), 0604);
+    fs::permissions(files.key, fs::perms(0604));
     EXPECT_THAT(warning, ThrowsMessage<std::runtime_error>(HasSubstr("everybody may read")));
 }
 
@@ -203,9 +206,23 @@ TEST(WarningsTest, TellWhatWorksButIsNotMeant) {
                 ::testing::ElementsAre(HasSubstr("listen.http sends"), HasSubstr("may have 256.")));
 }
 
+TEST(ReportTest, TellsTheServiceManagerAndKeepsNoDescriptor) {
+    const test::TempFolder folder;
+    const auto descriptors = [] { return std::distance(fs::directory_iterator("/proc/self/fd"), {}); };
+    for (const std::string& path : {folder / "notify", "@" + folder.path()}) {
+        const test::UnixSocket manager(SOCK_DGRAM, path);
+        ::setenv("NOTIFY_SOCKET", path.c_str(), 1);
+        const auto before = descriptors();
+        host::notifyServiceManager("READY=1");
+        EXPECT_EQ(descriptors(), before);
+        EXPECT_EQ(manager.received(), "READY=1\n") << path;
+    }
+    ::unsetenv("NOTIFY_SOCKET");
+}
+
 TEST(PasswdTest, LosesNoChangeThatOthersMake) {
     const test::TempFolder folder;
-    const std::string file = folder / "users";
+    const std::string file = folder / "new/users";
     host::UserEntries users;
     for (int i = 0; i < 8; ++i)
         users["user" + std::to_string(i)] = {"$x", true};
@@ -225,22 +242,15 @@ TEST(ConfigCheckTest, LooksAtEveryFile) {
     const test::TempFolder folder;
     const std::string certificate = folder / "new/cert.pem";
     const std::string key = folder / "new/key.pem";
-    const std::string otherKey = folder / "other.pem";
+    const std::string otherKey = folder / "other-key.pem";
     const std::string junk = folder.write("junk", "-----BEGIN CERTIFICATE-----\nx\n");
     const std::string noAdapters = folder.write("adapters.toml", "");
     EXPECT_THROW(host::makeTlsFiles({certificate, key, false}), std::runtime_error);
     EXPECT_TRUE(host::makeTlsFiles({certificate, key, true}));
     EXPECT_FALSE(host::makeTlsFiles({certificate, key, false}));
     EXPECT_TRUE(host::makeTlsFiles({folder / "other-cert.pem", otherKey, true}));
-    struct stat status {};
-    ASSERT_EQ(::stat(key.c_str(), &status), 0);
-    EXPECT_EQ(status.st_mode & 0777U, 0600U);
-    const struct {
-        int status;
-        std::string certificate;
-        std::string key;
-        Words more;
-    } table[] = {
+    EXPECT_EQ(fs::status(key).permissions(), fs::perms(0600));
+    const std::tuple<int, std::string, std::string, Words> table[] = {
         // First: with a sanitizer the providers stay where they are loaded.
         {2, certificate, key, {"--providers-directory", folder.path()}},
         {2, certificate, key, {"--providers-directory", "/nonexistent"}},
@@ -266,15 +276,16 @@ TEST(ConfigCheckTest, LooksAtEveryFile) {
         {2, junk, key, {}},
         {2, key, key, {}},
     };
-    for (const auto& row : table) {
-        const std::string config =
-            "[listen]\nsocket = ''\n[daemon]\nlock_file = '" + (folder / "lock") + "'\n";
-        Words arguments{"--config", folder.write("config", config), "--listen-https-port", "0"};
-        arguments.insert(arguments.end(), {"--tls-certificate", row.certificate, "--tls-key", row.key});
-        arguments.insert(arguments.end(), row.more.begin(), row.more.end());
-        EXPECT_EQ(host::checkConfiguration(read(arguments).settings), row.status) << &row - table;
+    const std::string config = folder.write("config",
+                                            "[listen]\nhttps_port = 0\nsocket = ''\n"
+                                            "[daemon]\nlock_file = '" +
+                                                (folder / "lock") + "'\n");
+    for (const auto& [status, certificateFile, keyFile, more] : table) {
+        Words arguments{"--config", config, "--tls-certificate", certificateFile, "--tls-key", keyFile};
+        arguments.insert(arguments.end(), more.begin(), more.end());
+        EXPECT_EQ(host::checkConfiguration(read(arguments).settings), status) << certificateFile << keyFile;
     }
-    ::unlink(key.c_str());
+    fs::remove(key);
     EXPECT_THROW(host::makeTlsFiles({certificate, key, true}), std::runtime_error);
 }
 

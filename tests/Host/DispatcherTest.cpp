@@ -141,11 +141,7 @@ TEST_F(DispatcherTest, AnswersEachMistakeByItsStatus) {
     const ClassName unknown{"Unknown"};
     const ClassName known{"Test_Gadget"};
     const CimPath a = gadget("a", "1");
-    const struct {
-        int status;
-        const char* operation;
-        Given parameters;
-    } table[] = {
+    const std::tuple<int, const char*, Given> table[] = {
         {4, "GetInstance", {}},
         {4, "GetInstance", {{"InstanceName", a}, {"instancename", a}}},
         {4, "GetInstance", {{"InstanceName", a}, {"Unknown", "x"}}},
@@ -175,9 +171,8 @@ TEST_F(DispatcherTest, AnswersEachMistakeByItsStatus) {
         {21, "PullInstancesWithPath", {{"EnumerationContext", "x"}, {"MaxObjectCount", "1"}}},
         {21, "CloseEnumeration", {{"EnumerationContext", "x"}}},
     };
-    for (const auto& row : table) {
-        EXPECT_EQ(status(row.operation, row.parameters), row.status) << row.operation << &row - table;
-    }
+    for (const auto& [expected, operation, parameters] : table)
+        EXPECT_EQ(status(operation, parameters), expected) << operation << parameters.size();
     m_caller.isAdministrator = false;
     EXPECT_EQ(status("DeleteInstance", {{"InstanceName", a}}), 2);
     EXPECT_EQ(statusIn(invoke(a, "Work", {})), 2);
@@ -259,25 +254,18 @@ TEST_F(DispatcherTest, CallsMethods) {
     EXPECT_EQ(output(result, "Echo"), "given hello");
     EXPECT_EQ(output(result, "Job"), "root/cimv2:Test_Gadget.ID=\"a\",Number=1");
 
-    const struct {
-        int status;
-        CimPath object;
-        const char* method;
-        std::vector<core::Argument> arguments;
-    } table[] = {
-        // One element of an array may come alone, and an optional input may be left out.
-        {0, a, "Work", {text, argument("Numbers", "7")}},
-        {0, a, "Work", {text}},
-        {6, gadget("a", "9"), "Work", {text}},
-        {6, CimPath("Unknown", {}), "Work", {text}},
-        {16, CimPath("Test_Gadget", {}), "Work", {text}},
-        {17, a, "Play", {}},
-        {16, a, "NotImplemented", {}},
-        {4, a, "Work", {text, text}},
-        {4, a, "Work", {text, argument("Unknown", "x")}},
-    };
-    for (const auto& row : table)
-        EXPECT_EQ(statusIn(invoke(row.object, row.method, row.arguments)), row.status) << &row - table;
+    const std::pair<int, CimPath> objects[] = {{0, a},  // an optional input may be left out
+                                               {6, gadget("a", "9")},
+                                               {6, CimPath("Unknown", {})},
+                                               {16, CimPath("Test_Gadget", {})}};
+    for (const auto& [expected, object] : objects)
+        EXPECT_EQ(statusIn(invoke(object, "Work", {text})), expected) << object.toString();
+    EXPECT_EQ(statusIn(invoke(a, "Play", {})), 17);
+    EXPECT_EQ(statusIn(invoke(a, "NotImplemented", {})), 16);
+    // One element of an array may come alone.
+    EXPECT_EQ(statusIn(invoke(a, "Work", {text, argument("Numbers", "7")})), 0);
+    for (const core::Argument& bad : {text, argument("Unknown", "x")})
+        EXPECT_EQ(statusIn(invoke(a, "Work", {text, bad})), 4);
 }
 
 TEST_F(DispatcherTest, TakesOnlyArgumentsOfTheDeclaredKind) {

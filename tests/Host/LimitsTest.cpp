@@ -5,8 +5,10 @@
 #include <ctime>
 
 #include "Framework/Model/CimError.h"
+#include "Host/Authentication/ClientAddress.h"
 #include "Host/Daemon/JobRetention.h"
 #include "Host/Operations/AnswerBudget.h"
+#include "Host/Server/ConnectionWatch.h"
 #include "Host/Server/UserSlots.h"
 
 namespace {
@@ -45,6 +47,67 @@ TEST(UserSlotsTest, MakeOnlyTheirOwnUserWait) {
     EXPECT_TRUE(host::HeldUserSlot(slots, "b", 0ms));
     second.reset();
     EXPECT_TRUE(host::HeldUserSlot(slots, "a", 0ms));
+}
+
+/// Connections with numbers that no descriptor has, so that ending one touches nothing.
+class ConnectionRoomTest : public ::testing::Test {
+  protected:
+    ~ConnectionRoomTest() override {
+        for (std::size_t i = 0; i < m_admitted.size(); ++i)
+            m_watch.closed(socketOf(i));
+    }
+    static int socketOf(std::size_t index) { return 1000000 + static_cast<int>(index); }
+    bool admit(const std::string& network, bool logsIn = false) {
+        const int socket = socketOf(m_admitted.size());
+        if (!m_watch.admit(socket, network, {})) return false;
+        m_watch.started(socket);
+        m_admitted.emplace_back(network, m_watch.suspend(socket));
+        if (logsIn) m_watch.loggedIn(socket);
+        return true;
+    }
+    /// Who had to go: each with its network and how many came before it.
+    std::string ended() const {
+        std::string text;
+        for (std::size_t i = 0; i < m_admitted.size(); ++i)
+            if (m_admitted[i].second.stop_requested()) text += m_admitted[i].first + std::to_string(i);
+        return text;
+    }
+
+    host::ConnectionWatch m_watch{{.connections = 8, .connectionsPerAddress = 3}};
+    std::vector<std::pair<std::string, std::stop_token>> m_admitted;
+};
+
+TEST_F(ConnectionRoomTest, KeepsAQuarterForNetworksFromWhichSomebodyLoggedIn) {
+    EXPECT_TRUE(admit("K", true));
+    m_watch.closed(socketOf(0));
+    for (const char* stranger : {"a", "b", "z", "z", "c", "d"})
+        EXPECT_TRUE(admit(stranger));
+    EXPECT_EQ(ended(), "");
+    EXPECT_TRUE(admit("e"));
+    EXPECT_EQ(ended(), "z3") << "the oldest of the network with the most";
+    EXPECT_TRUE(admit("K") && admit("K"));
+    EXPECT_EQ(ended(), "z3") << "two places were kept";
+    EXPECT_TRUE(admit("K"));
+    EXPECT_EQ(ended(), "a1z3") << "then a stranger makes room";
+    EXPECT_TRUE(admit("K"));
+    EXPECT_EQ(ended(), "a1z3K8") << "as many as one network may have";
+}
+
+TEST_F(ConnectionRoomTest, IsNotMadeByThoseWhoLoggedIn) {
+    for (const char* network : {"a", "b", "c", "d", "e", "f", "g"})
+        EXPECT_TRUE(admit(network, true));
+    EXPECT_TRUE(admit("a"));
+    EXPECT_FALSE(admit("x"));
+    EXPECT_EQ(ended(), "");
+    EXPECT_TRUE(admit("b", true)) << "known, as the one who goes";
+    EXPECT_EQ(ended(), "a7");
+    EXPECT_FALSE(admit("c"));
+    for (unsigned int i = 0; i < host::ConnectionWatch::kLocalConnections; ++i)
+        EXPECT_TRUE(admit(host::kLocalAddress, true)) << "places of their own";
+    EXPECT_FALSE(admit(host::kLocalAddress));
+    m_watch.idle(socketOf(m_admitted.size() - 1), 60s);
+    EXPECT_TRUE(admit(host::kLocalAddress));
+    EXPECT_EQ(ended(), "a7local24");
 }
 
 TEST(WantedPropertiesTest, FindAsFastAmongThousandsOfNames) {

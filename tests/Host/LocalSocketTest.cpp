@@ -2,14 +2,12 @@
 #include "Host/Server/LocalSocket.h"
 
 #include <gmock/gmock.h>
-#include <sys/socket.h>
 #include <sys/stat.h>
-#include <sys/un.h>
-#include <unistd.h>
 
 #include <filesystem>
 
 #include "Host/Server/HttpServer.h"
+#include "Host/UnixSocket.h"
 #include "Support/TempFolder.h"
 
 namespace {
@@ -21,15 +19,6 @@ class LocalSocketTest : public ::testing::Test {
     static void expectRefusal(const std::string& path, const std::string& reason) {
         EXPECT_THAT([&] { const LocalSocket socket(path); },
                     ::testing::ThrowsMessage<host::ListenError>(::testing::HasSubstr(reason)));
-    }
-    /// A socket that somebody else has bound there.
-    int bound() const {
-        sockaddr_un address{};
-        address.sun_family = AF_UNIX;
-        m_path.copy(address.sun_path, sizeof address.sun_path - 1);
-        const int socket = ::socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC, 0);
-        EXPECT_EQ(::bind(socket, reinterpret_cast<const sockaddr*>(&address), sizeof address), 0);
-        return socket;
     }
 
     const test::TempFolder m_folder;
@@ -49,12 +38,12 @@ TEST_F(LocalSocketTest, IsItsOwnersAloneAndGoneAtItsEnd) {
 }
 
 TEST_F(LocalSocketTest, ReplacesWhatAKilledDaemonLeftAndNothingElse) {
-    { const os::Descriptor killed(bound()); }
+    { const test::UnixSocket killed(SOCK_STREAM, m_path); }
     {
         const LocalSocket socket(m_path);
         const os::Descriptor listener(socket.listener());
     }
-    const os::Descriptor foreign(bound());
+    const test::UnixSocket foreign(SOCK_STREAM, m_path);
     ASSERT_EQ(::listen(foreign.number(), 1), 0);
     expectRefusal(m_path, "another process listens there");
     std::filesystem::rename(m_path, m_folder / "other");

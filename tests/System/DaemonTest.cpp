@@ -1,16 +1,14 @@
 // SPDX-License-Identifier: Apache-2.0
 // quenx-cimd as a whole, driven by the WBEM client wbemcli.
 #include <gmock/gmock.h>
-#include <sys/socket.h>
-#include <sys/un.h>
-#include <unistd.h>
 
 #include <csignal>
-#include <cstring>
 #include <filesystem>
 #include <thread>
 
 #include "CimXml/WireCheck.h"
+#include "Host/UnixSocket.h"
+#include "Support/SimulatedAdapters.h"
 #include "System/HeldFlash.h"
 #include "System/RawConnection.h"
 #include "System/RunningDaemon.h"
@@ -58,9 +56,8 @@ TEST(DaemonTest, ServesEveryClassToRealAndRecordedClients) {
         instances += names;
     }
     EXPECT_GT(instances, 10U);
-    for (const char* operation : {"ei", "gc", "ec"}) {
+    for (const char* operation : {"ei", "gc", "ec"})
         EXPECT_EQ(daemon.wbemcli(operation, "CIM_ManagedElement", {}, true).status, 0) << operation;
-    }
     for (const std::string& name : test::sampleNames()) {
         const test::RawConnection client(daemon.httpPort(), "127.0.0.1");
         client.send(test::httpRequest(test::readSample(name)));
@@ -72,14 +69,9 @@ TEST(DaemonTest, ServesEveryClassToRealAndRecordedClients) {
 
 TEST(DaemonTest, DeletesJobsThatHaveEndedWhenAskedTo) {
     RunningDaemon daemon({"--jobs-keep-seconds", "1"}, {"QUENX_LOG=stderr"});
-    test::HeldFlash flash(daemon.folder() / "state/eth0");
     const std::string job = startUpdate(daemon);
-    ASSERT_TRUE(reaches(daemon, job, "4"));
-    std::this_thread::sleep_for(std::chrono::seconds(3));
-    EXPECT_EQ(daemon.wbemcli("gi", job).status, 0);
-    flash.release();
     EXPECT_TRUE(daemon.program().waitFor(
-        "[audit] user=\"quenx-cimd\" address=\"local\" operation=\"DeleteInstance\" "
+        "quenx: [audit] user=\"quenx-cimd\" address=\"local\" operation=\"DeleteInstance\" "
         "target=\"root/cimv2:Quenx_ConcreteJob.InstanceID=\\\"Quenx:FirmwareUpdate@Job#1\\\"\" "
         "arguments=\"rule='jobs.keep_seconds'\" outcome=\"done\""));
     EXPECT_TRUE(contains(daemon.wbemcli("gi", job).error, "(6) CIM_ERR_NOT_FOUND"));
@@ -132,16 +124,9 @@ TEST(DaemonTest, IsDiscoveredFromTheInteropNamespace) {
 
 TEST(DaemonTest, LetsAFlashEndBeforeItStops) {
     for (const bool isDeleted : {false, true}) {
-        // A socket stands in for the service manager.
         const test::TempFolder folder;
-        const std::string path = folder / "notify";
-        sockaddr_un address{};
-        address.sun_family = AF_UNIX;
-        path.copy(address.sun_path, sizeof address.sun_path - 1);
-        const int manager = ::socket(AF_UNIX, SOCK_DGRAM | SOCK_CLOEXEC, 0);
-        ASSERT_EQ(::bind(manager, reinterpret_cast<const sockaddr*>(&address), sizeof address), 0);
-
-        RunningDaemon daemon({}, {"NOTIFY_SOCKET=" + path});
+        const test::UnixSocket manager(SOCK_DGRAM, folder / "notify");
+        RunningDaemon daemon({}, {"NOTIFY_SOCKET=" + folder / "notify"});
         test::HeldFlash flash(daemon.folder() / "state/eth0");
         const std::string job = startUpdate(daemon);
         ASSERT_TRUE(reaches(daemon, job, "4"));
@@ -159,11 +144,7 @@ TEST(DaemonTest, LetsAFlashEndBeforeItStops) {
         EXPECT_EQ(result.status, 0) << result.out;
         EXPECT_TRUE(contains(result.out, "Stopped.")) << result.out;
 
-        std::string told;
-        char bytes[512];
-        for (ssize_t length = 0; (length = ::recv(manager, bytes, sizeof bytes, MSG_DONTWAIT)) > 0;)
-            told.append(bytes, static_cast<std::size_t>(length)).append("\n");
-        ::close(manager);
+        const std::string told = manager.received();
         for (const char* part :
              {"READY=1", "STOPPING=1", "EXTEND_TIMEOUT_USEC=30000000", "STATUS=Waiting for"})
             EXPECT_THAT(told, HasSubstr(part));
@@ -171,7 +152,7 @@ TEST(DaemonTest, LetsAFlashEndBeforeItStops) {
 }
 
 TEST(DaemonTest, ReadsUsersAndCertificateAgain) {
-    RunningDaemon daemon;
+    RunningDaemon daemon({}, {"QUENX_LOG=", "TARVEL_SMASHv2_LOG_LEVEL=2"});
     const RunningDaemon other;
     const auto isServed = [&](const std::string& user, bool https) {
         daemon.user = daemon.password = user;
@@ -199,16 +180,42 @@ TEST(DaemonTest, ReadsUsersAndCertificateAgain) {
     for (int round = 0; round < 1000 && !isNew; ++round)
         isNew = isServed("admin", true);
     EXPECT_TRUE(isNew);
-    EXPECT_EQ(daemon.stop().status, 0);
+    const ProgramResult result = daemon.stop();
+    EXPECT_EQ(result.status, 0);
+    EXPECT_FALSE(contains(result.out, "[debug]")) << "nobody asked for a copy of the log";
+}
+
+/// A shell's script, whose arguments begin with $0, with mounts of its own.
+std::vector<std::string> withOwnMounts(std::vector<std::string> script) {
+    script.insert(script.begin(), {"/usr/bin/unshare", "-m", "--propagation", "private", "/bin/sh", "-c"});
+    return script;
+}
+bool canMount() {
+    return test::run(withOwnMounts({"mount --bind /etc /etc"})).status == 0;
+}
+
+TEST(DaemonTest, ReadsItsFileInEtcWhereNoneIsNamed) {
+    if (!canMount()) GTEST_SKIP() << "nothing can be mounted";
+    const test::TempFolder etc;
+    const auto withThisEtc = [&](const std::string& program, const std::string& argument) {
+        return test::run(
+            withOwnMounts({"mount --bind $0 /etc && exec \"$@\"", etc.path(), program, argument}),
+            {"QUENX_ADAPTERS"});
+    };
+    etc.write("quenx-adapters.toml", test::kTestAdapters);
+    EXPECT_THAT(withThisEtc(QUENXCTL, "adapters").out, HasSubstr("eth4  06:00.0"));
+    const ProgramResult without = withThisEtc(QUENX_CIMD, "--check-config");
+    EXPECT_FALSE(contains(without.error, "quenx-cimd.toml")) << without.error;
+    std::filesystem::create_directory(etc / "quenx-cimd");
+    etc.write("quenx-cimd/quenx-cimd.toml", "[listen]\nhttp = 1\n");
+    const ProgramResult with = withThisEtc(QUENX_CIMD, "--check-config");
+    EXPECT_EQ(with.status, 2);
+    EXPECT_EQ(with.error,
+              "quenx-cimd: /etc/quenx-cimd/quenx-cimd.toml:2: listen.http must be true or false\n");
 }
 
 TEST(DaemonTest, AsksPamAndTheGroupsOfTheSystem) {
-    const auto privately = [](std::vector<std::string> words) {
-        words.insert(words.begin(), {"/usr/bin/unshare", "-m", "--propagation", "private", "/bin/sh", "-c"});
-        return words;
-    };
-    if (test::run(privately({"mount --bind /etc /etc"})).status != 0)
-        GTEST_SKIP() << "nothing can be mounted";
+    if (!canMount()) GTEST_SKIP() << "nothing can be mounted";
     // A system of its own: the users below, all with the password "secret".
     const test::TempFolder etc;
     const std::string secret =
@@ -229,81 +236,55 @@ TEST(DaemonTest, AsksPamAndTheGroupsOfTheSystem) {
                           std::filesystem::copy_options::overwrite_existing);
     RunningDaemon daemon(
         {"--auth-method", "pam", "--auth-readers", "reader", "@watchers"}, {},
-        privately({"for f in passwd shadow group pam.d; do mount --bind $0/$f /etc/$f; done; exec \"$@\"",
-                   etc.path()}));
+        withOwnMounts({"for f in passwd shadow group pam.d; do mount --bind $0/$f /etc/$f; done; exec \"$@\"",
+                       etc.path()}));
     const char* const kMayDelete = "(6) CIM_ERR_NOT_FOUND";
     const char* const kMayRead = "(2) CIM_ERR_ACCESS_DENIED";
     const char* const kWrong = "Invalid username/password";
-    const struct {
-        const char* user;
-        const char* password;
-        const char* expected;
-    } table[] = {
+    const std::tuple<const char*, const char*, const char*> table[] = {
         {"root", "secret", kMayDelete}, {"chief", "secret", kMayDelete},
         {"reader", "secret", kMayRead}, {"watcher", "secret", kMayRead},
         {"chief", "wrong", kWrong},     {"other", "secret", "HTTP response code said error"},
         {"expired", "secret", kWrong},  {"unknown", "secret", kWrong},
     };
-    for (const auto& row : table) {
-        daemon.user = row.user;
-        daemon.password = row.password;
-        const ProgramResult result = daemon.wbemcli("di", "Quenx_ConcreteJob.InstanceID=\"none\"");
-        EXPECT_TRUE(contains(result.error, row.expected)) << row.user << result.error;
+    for (const auto& [user, password, expected] : table) {
+        daemon.user = user;
+        daemon.password = password;
+        EXPECT_THAT(daemon.wbemcli("di", "Quenx_ConcreteJob.InstanceID=\"none\"").error, HasSubstr(expected))
+            << user;
     }
 }
 
-/// Installs the build below a folder, for a prefix, as a package is staged. The component is that of every
-/// file here; named, it leaves the manifest of a real installation alone.
-ProgramResult installBelow(const test::TempFolder& place, const std::string& prefix) {
-    return test::run(
-        {CMAKE, "--install", QUENX_BUILD, "--strip", "--component", "Unspecified", "--prefix", prefix},
-        {"DESTDIR=" + (place / "staged")});
-}
-
-TEST(DaemonTest, RunsWhereItIsInstalled) {
-    const test::TempFolder place;
-    const ProgramResult installed = installBelow(place, "/new/prefix");
-    ASSERT_EQ(installed.status, 0) << installed.error;
-    const std::string prefix = place / "staged/new/prefix";
-    const std::string daemon = prefix + "/sbin/quenx-cimd";
-    const std::string config = place.write(
-        "config",
-        "[listen]\nhttps = false\nhttp = true\nhttp_port = 0\nsocket = ''\n[daemon]\nlock_file = '" +
-            (place / "lock") + "'\n");
-    const ProgramResult checked = test::run({daemon, "--check-config", "--config", config});
-    EXPECT_EQ(checked.status, 0) << checked.error;
-    EXPECT_EQ(test::run({prefix + "/bin/quenxctl", "mof"}).status, 0);
-    for (const auto& file : std::filesystem::recursive_directory_iterator(prefix)) {
-        if (!file.is_regular_file()) continue;
-        const auto bytes = test::readTestFile(file.path().string());
-        EXPECT_FALSE(contains({bytes.begin(), bytes.end()}, QUENX_BUILD "/lib")) << file.path();
-    }
-    // The users file, too, has a directory that is not there yet.
-    const std::string users = place / "etc/users";
-    const std::string script = "echo x | \"$0\" --config \"$1\" passwd ann --users \"$2\"";
-    EXPECT_EQ(test::run({"/bin/sh", "-c", script, daemon, config, users}).status, 0);
-    EXPECT_TRUE(std::filesystem::exists(users));
-}
-
-TEST(DaemonTest, InstallsConfigurationWhereThereIsNone) {
+TEST(DaemonTest, RunsWhereItIsInstalledAndKeepsWhatIsConfigured) {
     // Only an installation of the distribution's kind configures the machine itself.
     for (const auto& [prefix, folder] : {std::pair{"/usr", "/etc"}, {"/usr/local", "/usr/local/etc"}}) {
         const test::TempFolder place;
-        const std::string name = "staged" + std::string(folder) + "/pam.d/quenx-cimd";
-        const std::string file = place / name;
-        ASSERT_EQ(installBelow(place, prefix).status, 0) << prefix;
+        const std::string staged = place / "staged";
+        // The component is that of every file here; named, it leaves the manifest of a real installation
+        // alone.
+        const std::vector<std::string> install{CMAKE,         "--install",   QUENX_BUILD, "--strip",
+                                               "--component", "Unspecified", "--prefix",  prefix};
+        const ProgramResult installed = test::run(install, {"DESTDIR=" + staged});
+        ASSERT_EQ(installed.status, 0) << installed.error;
+        const std::string config = place.write("config",
+                                               "[listen]\nhttps = false\nhttp = true\nhttp_port = 0\n"
+                                               "socket = ''\n[daemon]\nlock_file = '" +
+                                                   (place / "lock") + "'\n");
+        const ProgramResult checked =
+            test::run({staged + prefix + "/sbin/quenx-cimd", "--check-config", "--config", config});
+        EXPECT_EQ(checked.status, 0) << checked.error;
+        EXPECT_EQ(test::run({staged + prefix + "/bin/quenxctl", "mof"}).status, 0);
+        for (const auto& file : std::filesystem::recursive_directory_iterator(staged)) {
+            if (!file.is_regular_file()) continue;
+            const auto bytes = test::readTestFile(file.path().string());
+            EXPECT_FALSE(contains({bytes.begin(), bytes.end()}, QUENX_BUILD "/lib")) << file.path();
+        }
+        const std::string file = staged + folder + "/pam.d/quenx-cimd";
         EXPECT_EQ(test::readTestFile(file), test::readTestFile(QUENX_PACKAGING_DIR "/pam.d/quenx-cimd"));
-        place.write(name, "# mine");
-        EXPECT_THAT(installBelow(place, prefix).out, HasSubstr("Kept: " + file));
-        EXPECT_EQ(test::readTestFile(file).size(), std::strlen("# mine"));
+        std::filesystem::resize_file(file, 0);
+        EXPECT_THAT(test::run(install, {"DESTDIR=" + staged}).out, HasSubstr("Kept: " + file));
+        EXPECT_TRUE(test::readTestFile(file).empty());
     }
-}
-
-TEST(DaemonTest, CopiesItsLogToStandardErrorWhenAsked) {
-    RunningDaemon talkative({}, {"QUENX_LOG=stderr", "TARVEL_SMASHv2_LOG_LEVEL=2"});
-    EXPECT_TRUE(talkative.program().waitFor("quenx: [debug] \"Serving https://"));
-    RunningDaemon quiet({}, {"QUENX_LOG=", "TARVEL_SMASHv2_LOG_LEVEL=2"});
-    EXPECT_FALSE(contains(quiet.stop().out, "[debug]"));
 }
 
 TEST(DaemonTest, NamesWhatKeepsItFromServing) {
@@ -321,11 +302,7 @@ TEST(DaemonTest, NamesWhatKeepsItFromServing) {
     const std::string port = std::to_string(daemon.httpPort());
     const std::string taken = "--listen-http-port=" + port;
     const std::string free = "--listen-http-port=0";
-    const struct {
-        int status;
-        std::vector<std::string> options;
-        std::string said;
-    } table[] = {
+    const std::tuple<int, std::vector<std::string>, std::string> table[] = {
         {1, {held, free}, "process " + std::to_string(daemon.program().id()) + " (quenx-cimd) holds "},
         {1, {lock, taken}, "127.0.0.1 port " + port + ": Address already in use. Stop the program that"},
         // The lock is free again.
@@ -334,14 +311,13 @@ TEST(DaemonTest, NamesWhatKeepsItFromServing) {
         {2, {lock, taken, "--check-config"}, "port " + port + ": Address already in use."},
         {0, {held, taken, "--check-config"}, ""},
     };
-    for (const auto& row : table) {
-        std::vector<std::string> command{
-            QUENX_CIMD,        "--config", folder.write("empty", ""), "--listen-https=false", "--listen-http",
-            "--listen-socket", ""};
-        command.insert(command.end(), row.options.begin(), row.options.end());
+    const std::string config = folder.write("config", "[listen]\nhttps = false\nhttp = true\nsocket = ''\n");
+    for (const auto& [status, options, said] : table) {
+        std::vector<std::string> command{QUENX_CIMD, "--config", config};
+        command.insert(command.end(), options.begin(), options.end());
         const ProgramResult result = test::run(command);
-        EXPECT_EQ(result.status, row.status) << result.error;
-        EXPECT_THAT(result.error, HasSubstr(row.said));
+        EXPECT_EQ(result.status, status) << result.error;
+        EXPECT_THAT(result.error, HasSubstr(said));
     }
 }
 

@@ -1,14 +1,13 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
-#include <fcntl.h>
-#include <sys/file.h>
-#include <unistd.h>
-
 #include <chrono>
 #include <filesystem>
+#include <optional>
 #include <string>
 #include <thread>
+
+#include "Utils/Os/Linux/FileLock.h"
 
 namespace test {
 
@@ -19,10 +18,8 @@ class HeldFlash {
     /// @param folder  the adapter's, in the state directory; made when it is not there yet
     explicit HeldFlash(const std::string& folder) : m_folder(folder) {
         std::filesystem::create_directories(folder);
-        m_lock = ::open((folder + "/state.lock").c_str(), O_RDWR | O_CREAT | O_CLOEXEC, 0644);
-        ::flock(m_lock, LOCK_EX);
+        m_lock.emplace(folder + "/state.lock");
     }
-    ~HeldFlash() { release(); }
 
     /// Whether an update comes to hold the flash. It leaves its process id there.
     bool isWaitedFor() const {
@@ -36,14 +33,11 @@ class HeldFlash {
     }
 
     /// Lets updates go on.
-    void release() {
-        if (m_lock >= 0) ::close(m_lock);
-        m_lock = -1;
-    }
+    void release() { m_lock.reset(); }
 
   private:
     const std::string m_folder;
-    int m_lock = -1;
+    std::optional<os::FileLock> m_lock;
 };
 
 }  // namespace test

@@ -11,6 +11,9 @@
 namespace {
 
 using test::contains;
+using ::testing::AllOf;
+using ::testing::HasSubstr;
+using ::testing::Not;
 
 /// Images in a directory that the inventory looks into.
 class InventoryTest : public test::Quenxctl {
@@ -37,30 +40,20 @@ TEST_F(InventoryTest, TellsAnOrdinaryUserWhatOnlyRootMaySee) {
     if (::geteuid() != 0) GTEST_SKIP() << "needs root, to become another user";
     EXPECT_EQ(quenxctl("install --target eth0 IMAGE").status, 0);
     std::filesystem::permissions(m_folder.path(), std::filesystem::perms(0755));
-    const auto asNobody = [this](const std::string& line) {
-        std::vector<std::string> words{"/usr/bin/setpriv", "--reuid=65534", "--regid=65534",
-                                       "--clear-groups"};
-        const std::vector<std::string> program = command(line);
-        words.insert(words.end(), program.begin(), program.end());
-        return test::run(words);
-    };
-    const std::string said = "The firmware of eth0 cannot be read. Run quenxctl as root, ";
-    const test::ProgramResult listed = asNobody("adapters");
+    const test::ProgramResult listed = test::run(test::asNobody(command("adapters")));
     EXPECT_EQ(listed.status, 0);
-    EXPECT_TRUE(contains(listed.error, said)) << listed.error;
-    EXPECT_TRUE(contains(listed.out, "eth1") && contains(listed.out, "IMG_PXE 1")) << listed.out;
-    const test::ProgramResult checked = asNobody("check --target eth0 IMAGE");
+    EXPECT_THAT(listed.error, HasSubstr("The firmware of eth0 cannot be read. Run quenxctl as root, "));
+    EXPECT_THAT(listed.out, AllOf(HasSubstr("eth1"), HasSubstr("IMG_PXE 1")));
+    const test::ProgramResult checked = test::run(test::asNobody(command("check --target eth0 IMAGE")));
     EXPECT_EQ(checked.status, 1);
-    EXPECT_TRUE(contains(checked.error, "The firmware of eth0 cannot be read.\nRun quenxctl as root, "))
-        << checked.error;
+    EXPECT_THAT(checked.error, HasSubstr("The firmware of eth0 cannot be read.\nRun quenxctl as root, "));
 }
 
 TEST_F(InventoryTest, ChangesNothingByACheckAndInstallsByIdentity) {
-    const std::string table = quenxctl("identities").out;
-    for (const char* part : {"IMG_PXE 2, IMG_UEFI 2  IMG_PXE,IMG_UEFI  file://", "/firmware/new.rom",
-                             "/firmware/other.rom", "Firmware of adapter eth0"})
-        EXPECT_TRUE(contains(table, part)) << part << "\n" << table;
-    EXPECT_FALSE(contains(table, "broken.rom")) << table;
+    EXPECT_THAT(quenxctl("identities").out,
+                AllOf(HasSubstr("IMG_PXE 2, IMG_UEFI 2  IMG_PXE,IMG_UEFI  file://"),
+                      HasSubstr("/firmware/new.rom"), HasSubstr("/firmware/other.rom"),
+                      HasSubstr("Firmware of adapter eth0"), Not(HasSubstr("broken.rom"))));
 
     const std::string identity = " --target eth0 --identity " + idOf("1af4-1041");
     // A file need not be in the inventory.
@@ -113,9 +106,8 @@ TEST_F(InventoryTest, PrintsTheSchemaInOrderAndQualified) {
           "        CIM_ConcreteJob REF Job,\n",
           "    [ Key,\n       Override ( \"Antecedent\" ) ]\n",
           "ValueMap { \"1\", \"2\" },\n       Values { \"Local Time\", \"UTC Time\" } ]\n"
-          "    uint16 LocalOrUtcTime;\n"}) {
-        EXPECT_TRUE(contains(mof, part)) << part << "\n" << mof;
-    }
+          "    uint16 LocalOrUtcTime;\n"})
+        EXPECT_THAT(mof, HasSubstr(part));
 }
 
 }  // namespace

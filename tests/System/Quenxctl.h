@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
-#include <gtest/gtest.h>
+#include <gmock/gmock.h>
 
 #include <sstream>
 #include <string>
@@ -23,6 +23,12 @@ inline std::vector<std::string> wordsOf(const std::string& line, const std::stri
     return words;
 }
 
+/// The command as the user nobody, whom only root can become.
+inline std::vector<std::string> asNobody(std::vector<std::string> command) {
+    command.insert(command.begin(), {"/usr/bin/setpriv", "--reuid=65534", "--regid=65534", "--clear-groups"});
+    return command;
+}
+
 /// quenxctl on simulated adapters of its own, those of SimulatedAdapters.h.
 class Quenxctl : public ::testing::Test {
   protected:
@@ -41,7 +47,13 @@ class Quenxctl : public ::testing::Test {
     void expectError(const std::string& line, int status, const std::string& part) const {
         const ProgramResult result = quenxctl(line);
         EXPECT_EQ(result.status, status) << line << "\n" << result.out << result.error;
-        EXPECT_TRUE(contains(result.error, part)) << line << "\n" << result.error << "\nwanted: " << part;
+        EXPECT_THAT(result.error, ::testing::HasSubstr(part)) << line;
+    }
+    /// Runs it, and expects success and this in the output.
+    void expectOutput(const std::string& line, const std::string& part) const {
+        const ProgramResult result = quenxctl(line);
+        EXPECT_EQ(result.status, 0) << line << "\n" << result.error;
+        EXPECT_THAT(result.out, ::testing::HasSubstr(part)) << line;
     }
     /// "IMG_PXE 1, IMG_UEFI 0": what an adapter carries, as a new process sees it.
     std::string firmwareOf(const std::string& adapter) const {

@@ -63,15 +63,19 @@ class RawConnection {
         char first = 0;
         return ::recv(m_socket, &first, 1, MSG_PEEK) == 1;
     }
-    /// What comes until the other side closes. Expects that within a minute, which is longer than a busy
-    /// machine takes.
+    /// A piece of what comes; empty once the other side has closed. Expects one of them within a minute,
+    /// which is longer than a busy machine takes.
+    std::string receivePiece() const {
+        std::array<char, 2048> bytes{};
+        const ssize_t length = ::recv(m_socket, bytes.data(), bytes.size(), 0);
+        EXPECT_TRUE(length >= 0 || errno == ECONNRESET) << "the connection stays open";
+        return {bytes.data(), length > 0 ? static_cast<std::size_t>(length) : 0};
+    }
+    /// What comes until the other side closes.
     std::string receive() const {
         std::string answer;
-        std::array<char, 4096> bytes{};
-        ssize_t length = 0;
-        while ((length = ::recv(m_socket, bytes.data(), bytes.size(), 0)) > 0)
-            answer.append(bytes.data(), static_cast<std::size_t>(length));
-        EXPECT_TRUE(length == 0 || errno == ECONNRESET) << "the connection stays open";
+        for (std::string piece = receivePiece(); !piece.empty(); piece = receivePiece())
+            answer += piece;
         return answer;
     }
 

@@ -78,11 +78,7 @@ TEST_F(WrongUseTest, RefusesWrongImagesNamingBothSides) {
 
 TEST_F(WrongUseTest, SaysWhatIsWrongWithACommandLineAndWhatToDo) {
     const std::string none = m_folder / "none";
-    const struct {
-        std::string line;
-        int status;
-        std::string part;
-    } rows[] = {
+    const std::tuple<std::string, int, std::string> table[] = {
         {"install --target eth7 IMAGE", 4, "\nThe adapters are eth0, eth1, eth2, eth3, eth4."},
         {"install --target EHT2 IMAGE", 4, "\"EHT2\".\nDid you mean eth2? The adapters are eth0, "},
         {"install --target 0001:03:00.0 IMAGE", 4, "There is no adapter \"0001:03:00.0\"."},
@@ -114,8 +110,8 @@ TEST_F(WrongUseTest, SaysWhatIsWrongWithACommandLineAndWhatToDo) {
         {"adapters --providers " + none, 2, "Cannot read the provider directory"},
         {"adapters --providers " + m_folder.path(), 2, "There is no provider library in "},
     };
-    for (const auto& row : rows)
-        expectError(row.line, row.status, row.part);
+    for (const auto& [line, status, part] : table)
+        expectError(line, status, part);
     // No bad input: the empty name after the plus sign asks for no type at all.
     EXPECT_EQ(quenxctl("install --target eth0 IMAGE --types IMG_PXE+").status, 0);
     EXPECT_EQ(quenxctl("adapters", {"QUENXCTL_USER=a"}).status, 0) << "set for whenever there is a server";
@@ -130,12 +126,7 @@ TEST_F(WrongUseTest, SaysWhatIsWrongWithACommandLineAndWhatToDo) {
 }
 
 TEST_F(WrongUseTest, WritesOneJsonDocumentForErrorsToo) {
-    const struct {
-        const char* line;
-        int status;
-        const char* key;
-        nlohmann::json value;
-    } rows[] = {
+    const std::tuple<std::string, int, const char*, nlohmann::json> table[] = {
         {"adapters", 0, "/adapters/0/name", "eth0"},
         {"instances Quenx_EthernetPort", 0, "/instances/0/class", "Quenx_EthernetPort"},
         {"identities", 0, "/identities/0/installable", false},
@@ -148,12 +139,11 @@ TEST_F(WrongUseTest, WritesOneJsonDocumentForErrorsToo) {
         {"install --target eth0 IMAGE", 3, "/result", "already current"},
         {"install --target eth0 IMAGE --force", 0, "/after/0/version", 2},
     };
-    for (const auto& row : rows) {
-        const ProgramResult result = quenxctl(row.line + std::string(" --json"));
-        EXPECT_EQ(result.status, row.status) << result.out << result.error;
+    for (const auto& [line, status, key, value] : table) {
+        const ProgramResult result = quenxctl(line + " --json");
+        EXPECT_EQ(result.status, status) << result.out << result.error;
         const auto document = nlohmann::json::parse(result.out, nullptr, false);
-        EXPECT_EQ(document.value(nlohmann::json::json_pointer(row.key), nlohmann::json()), row.value)
-            << result.out;
+        EXPECT_EQ(document.value(nlohmann::json::json_pointer(key), nlohmann::json()), value) << result.out;
     }
 }
 
