@@ -4,6 +4,7 @@
 #include "Framework/Model/CimError.h"
 #include "Framework/Model/CimPropertyList.h"
 #include "Support/TestModel.h"
+#include "Support/Together.h"
 
 namespace {
 
@@ -37,6 +38,41 @@ TEST(CimPropertyTest, ChecksAllOfAModificationFirst) {
     EXPECT_EQ(gadget.Codes.get(), std::vector<unsigned short>{9});
     const auto tooLarge = core::CimValue::arrayOf(core::CimType::Uint32, {std::uint64_t{65536}});
     EXPECT_THROW(gadget.Codes.setValue(tooLarge), core::CimError);
+}
+
+TEST(CimPropertyTest, MayBeUsedByAnyThreadAtOnce) {
+    for (int round = 0; round < 10; ++round) {
+        test::Gadget gadget("a");
+        test::Gadget other("b");
+        test::Link link;
+        core::CimPropertyList requested;
+        requested.add("Caption", core::CimValue::of(core::CimType::String, std::string("requested")));
+        const auto readDeclaration = [] { core::declarationsOf(test::Gadget::classInfo); };
+        test::together({
+            [&] { gadget.ID = "c"; },
+            [&] { gadget.Number = 7; },
+            [&] { gadget.getPath(); },
+            [&] { gadget.getKeys(); },
+            [&] { gadget.getProperties(); },
+            [&] { gadget.modifyInstance(requested); },
+            [&] { EXPECT_EQ(core::CimPath::of(gadget).getKeys().size(), 2U); },
+            [&] { core::CimPath::of(other).isSameObjectAs(gadget); },
+            [&] { gadget.Caption = other.Caption; },
+            [&] { gadget.Caption.setNull(); },
+            [&] { gadget.Caption.IsNull(); },
+            [&] { gadget.Caption.get(); },
+            [&] { gadget.Caption.toString(); },
+            [&] { gadget.Codes.push_back(7); },
+            [&] {
+                gadget.Codes = {8, 9};
+            },
+            [&] { gadget.Codes.get(); },
+            [&] { link.From.assign(&gadget); },
+            [&] { link.From.getPath(); },
+            readDeclaration,
+            readDeclaration,
+        });
+    }
 }
 
 TEST(CimPropertyTest, RefersToATargetThatHasGone) {

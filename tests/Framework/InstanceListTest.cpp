@@ -5,12 +5,11 @@
 #include <unistd.h>
 
 #include <cstdlib>
-#include <future>
-#include <thread>
 
 #include "Framework/Classes/CimBroker.h"
 #include "Framework/Classes/RequestScope.h"
 #include "Support/TestModel.h"
+#include "Support/Together.h"
 
 namespace {
 
@@ -79,6 +78,33 @@ void destroyOne() {
     core::drainReaper([] {});
 }
 
+TEST_F(InstanceListTest, MayBeUsedByAnyThreadAtOnce) {
+    for (int round = 0; round < 10; ++round) {
+        auto list = std::make_unique<core::InstanceList>();
+        core::InstanceList other;
+        for (const char* id : {"early", "late"})
+            list->add(new Gadget(id));
+        auto kept = list->getElements(false);
+        core::CimInstance* const early = kept.first();
+        core::CimInstance* const late = kept.next();
+        test::together({
+            [&] { list->add(new Gadget("new")); },
+            [&] { list->add(new Slow); },
+            [&] { early->setDeleted(true); },
+            [&] { list->publish(other); },
+            [&] { list->clear(); },
+            [&] { list->size(); },
+            [&] { ids(list->getElements(false)); },
+            [&] { other.add(new Gadget("other")); },
+            destroyOne,
+            destroyOne,
+            [] { core::isReaperBusy(); },
+        });
+        test::together({[&] { list.reset(); }, [&] { late->setDeleted(true); }});
+    }
+    core::drainReaper([] {});
+}
+
 TEST_F(InstanceListTest, DestroysInstancesUntilTheProcessHasEnded) {
     // As an agent that is still loaded when the process ends. A process of its own: threads survive no fork.
     GTEST_FLAG_SET(death_test_style, "threadsafe");
@@ -97,30 +123,20 @@ TEST_F(InstanceListTest, DestroysInstancesUntilTheProcessHasEnded) {
         testing::ExitedWithCode(0), "");
 }
 
-std::size_t countGadgets() {
-    return core::GetCimBroker()->getInstances("test_GADGET", "").size();
-}
-
-TEST(CimBrokerTest, LetsAnAgentGoOnlyAfterTheRequestsThatUseIt) {
-    auto agent = std::make_unique<test::GadgetAgent>();
-    const test::Gadget* gadget = agent->add("held");
-    std::promise<void> enumerated;
-    std::promise<void> proceed;
-    auto request = std::async(std::launch::async, [&] {
-        const core::RequestScope scope;
-        EXPECT_EQ(countGadgets(), 1U);
-        enumerated.set_value();
-        proceed.get_future().wait();
-        return gadget->ID.get();
-    });
-    enumerated.get_future().wait();
-    auto leaving = std::async(std::launch::async, [&] { agent.reset(); });
-    while (countGadgets() != 0)
-        std::this_thread::yield();
-    EXPECT_EQ(test::Gadget::living, 1);
-    proceed.set_value();
-    EXPECT_EQ(request.get(), "held");
-    leaving.wait();
+TEST(CimBrokerTest, LetsAgentsComeAndGoWhileTheyAreUsed) {
+    const auto come = [] {
+        for (int i = 0; i < 20; ++i)
+            test::GadgetAgent().add("a");
+    };
+    const auto use = [] {
+        for (int i = 0; i < 200; ++i) {
+            const core::RequestScope scope;
+            for (core::CimInstance* each :
+                 core::InstanceRange(core::GetCimBroker()->getInstances("test_GADGET", "")))
+                EXPECT_EQ(each->getPath()->getClassName(), "Test_Gadget");
+        }
+    };
+    test::together({come, come, use, use});
     EXPECT_EQ(test::Gadget::living, 0);
 }
 
