@@ -77,11 +77,7 @@ Quenx_ConcreteJob::Quenx_ConcreteJob(std::string adapterName, int jobId, std::st
 
 Quenx_ConcreteJob::~Quenx_ConcreteJob() {
     // The worker uses everything else here, so it ends first.
-    std::unique_ptr<JobThread> worker;
-    {
-        const utils::Mutex::AutoLocker lock(m_jobMutex);
-        worker = std::move(m_myThread);
-    }
+    m_myThread.reset();
 }
 
 std::string Quenx_ConcreteJob::getUniqId() const {
