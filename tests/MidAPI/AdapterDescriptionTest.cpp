@@ -137,6 +137,18 @@ TEST(AdapterDescriptionTest, MakesTheFactoryFlashOfTheFileAndTheListedComponents
                     "{ type = \"IMG_iSCSI\", revision = 4 } ]"));
     EXPECT_EQ("IMG_iSCSI 4, IMG_PXE 1, IMG_UEFI 9", test::componentsOf("eth0"));
     EXPECT_FALSE(ma::parseOptionRom(adapters->flashContent("eth0")).error);
+
+    // An image with a CLP entry is changed where it is, and not replaced by a made one, which is shorter.
+    const auto clp = ma::makeRomImage({.type = utils::FirmwareType::CLP,
+                                       .vendorId = 0x1af4,
+                                       .deviceId = 0x1041,
+                                       .furtherDeviceIds = {},
+                                       .length = 4096});
+    adapters.folder().write("clp.rom", std::span(clp));
+    adapters.folder().write("clp.toml", adapterWith("flash_file = \"clp.rom\"\ncomponents = "
+                                                    "[ { type = \"IMG_CLP\", revision = 9 } ]"));
+    const ma::Simulator simulator(adapters.folder() / "clp.toml", adapters.stateDirectory());
+    EXPECT_EQ(simulator.flashContent("eth0"), test::withRevision(clp, 9));
 }
 
 }  // namespace

@@ -74,6 +74,13 @@ TEST_F(WrongUseTest, RefusesWrongImagesNamingBothSides) {
                   "Use a newer image, or install this one with --force.\n");
     EXPECT_EQ(quenxctl("install --target eth0 --force " + older).status, 0);
     EXPECT_EQ(firmwareOf("eth0"), "IMG_PXE 1, IMG_UEFI 0");
+
+    // A CLP entry comes, and would go, with the image that has it.
+    const std::string clp = made({{CLP, 3}}, 0x1af4, 0x1041);
+    EXPECT_EQ(quenxctl("install --target eth0 --force --types IMG_CLP " + clp).status, 0);
+    EXPECT_EQ(firmwareOf("eth0"), "IMG_CLP 3, IMG_PXE 3, IMG_UEFI 0");
+    expectRefusal(made({{PXE, 4}}, 0x1af4, 0x1041),
+                  "The image types differ: eth0 has IMG_CLP, but the image does not.\n");
 }
 
 TEST_F(WrongUseTest, SaysWhatIsWrongWithACommandLineAndWhatToDo) {
