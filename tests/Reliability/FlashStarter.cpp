@@ -8,12 +8,12 @@
 
 namespace {
 
-// For as long as this library is loaded.
-const os::OSLockerLinux locker;
+// Never destroyed: a flash that still runs when the process ends needs it.
+const os::OSLockerLinux& locker = *new os::OSLockerLinux;
 core::CimRequests requests{"root/cimv2"};
 
-/// Starts an update of the first port; 5 stands for "update".
-std::uint32_t install(const std::string& uri) {
+/// Starts an update of the first port; 5 stands for "update". Throws when there is no job.
+std::string install(const std::string& uri) {
     using core::CimType;
     using core::CimValue;
     const core::CimPath service = requests.enumerateInstanceNames("Quenx_SoftwareInstallationService").at(0);
@@ -24,7 +24,9 @@ std::uint32_t install(const std::string& uri) {
                        {"Target", CimValue::of(CimType::Reference, port)},
                        {"InstallOptions", CimValue::arrayOf(CimType::Uint16, {std::uint64_t{5}})},
                        {"InstallOptionsValues", CimValue::arrayOf(CimType::String, {})}})
-        .returnValue;
+        .outputs.at(0)
+        .value.get<core::CimPath>()
+        ->toString();
 }
 
 }  // namespace
@@ -35,10 +37,11 @@ QUENX_EXPORT int agentCount() {
     return static_cast<int>(core::GetCimBroker()->useAgents().size());
 }
 
-/// 1 when a job has been made for the image at this URI.
+/// The number of the job that has been made for the image at this URI; 0 for none.
 QUENX_EXPORT int startFlash(const char* uri) {
     try {
-        return install(uri) == 4096U ? 1 : 0;
+        const std::string job = install(uri);
+        return std::stoi(job.substr(job.find('#') + 1));
     } catch (const std::exception&) {
         return 0;
     }

@@ -3,10 +3,11 @@
 // theirs does for the first time has been done for it before. It has never logged a line either. It loads two
 // providers, unloads the one with the index CLOSED first, and prints what is left after each step.
 //
-//   HostOfC ONE OTHER STARTER CLOSED flash URI   unloads while the flash runs
-//   HostOfC ONE OTHER STARTER CLOSED calls URI   unloads while many threads call, wrongly
+//   HostOfC ONE OTHER STARTER CLOSED flash URI   unloads while the flash runs, twice
+//   HostOfC ONE OTHER STARTER CLOSED calls URI   unloads while the flash runs and many threads call
 //   HostOfC ONE OTHER STARTER CLOSED leave URI   the main thread leaves while the flash runs
 //   HostOfC ONE OTHER STARTER CLOSED fork URI    the same, after a child has ended
+//   HostOfC ONE OTHER STARTER CLOSED exit URI    exits while the flash runs
 #include <dlfcn.h>
 #include <pthread.h>
 #include <stdio.h>
@@ -35,9 +36,10 @@ int isMapped(const char* library) {
     return handle == nullptr ? 0 : 1;
 }
 
-void* callWrongly(void*) {
+/// Mostly refused, since one flash runs already.
+void* callOften(void* uri) {
     while (__atomic_load_n(&stopCalling, __ATOMIC_ACQUIRE) == 0)
-        startFlash("nonsense");
+        startFlash(static_cast<const char*>(uri));
     return nullptr;
 }
 
@@ -46,7 +48,7 @@ void* callWrongly(void*) {
 int main(int argc, char** argv) {
     if (argc != 7) return 2;
     alarm(kHangsAfterSeconds);
-    void* const providers[] = {load(argv[1]), load(argv[2])};
+    void* providers[] = {load(argv[1]), load(argv[2])};
     void* const starter = load(argv[3]);
     startFlash = reinterpret_cast<int (*)(const char*)>(dlsym(starter, "startFlash"));
     const auto agentCount = reinterpret_cast<int (*)()>(dlsym(starter, "agentCount"));
@@ -55,11 +57,11 @@ int main(int argc, char** argv) {
     };
     report();
 
+    printf("job %d\n", startFlash(argv[6]));
     const bool calls = strcmp(argv[5], "calls") == 0;
     pthread_t threads[kThreads];
     for (int i = 0; calls && i < kThreads; ++i)
-        pthread_create(&threads[i], nullptr, callWrongly, nullptr);
-    if (!calls && startFlash(argv[6]) != 1) return 3;
+        pthread_create(&threads[i], nullptr, callOften, argv[6]);
     const bool forks = strcmp(argv[5], "fork") == 0;
     const bool isLeaving = forks || strcmp(argv[5], "leave") == 0;
     if (forks) {
@@ -77,6 +79,7 @@ int main(int argc, char** argv) {
         waitpid(child, &status, 0);
         printf("child: %d\n", status);
     }
+    if (strcmp(argv[5], "exit") == 0) exit(0);
     // The worker is the last thread then, and what it runs into is the end of the process.
     if (isLeaving) pthread_exit(nullptr);
     const int closedFirst = atoi(argv[4]);
@@ -84,6 +87,13 @@ int main(int argc, char** argv) {
     report();
     dlclose(providers[1 - closedFirst]);
     report();
+    if (!calls) {
+        providers[0] = load(argv[1]);
+        providers[1] = load(argv[2]);
+        printf("job %d\n", startFlash(argv[6]));
+        dlclose(providers[0]);
+        dlclose(providers[1]);
+    }
     __atomic_store_n(&stopCalling, 1, __ATOMIC_RELEASE);
     for (int i = 0; calls && i < kThreads; ++i)
         pthread_join(threads[i], nullptr);
