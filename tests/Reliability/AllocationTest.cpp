@@ -18,8 +18,50 @@ constexpr unsigned kInsufficientMemory = 4100;
 class AllocationTest : public test::UpdateTest {
   protected:
     /// One update, with the n-th allocation failing. False when it was never reached.
-    bool failAt(On on, std::uint64_t n, bool releases);
-    void failEverywhere(On on, std::uint64_t step, bool releases);
+    bool failAt(On on, std::uint64_t n, bool releases) {
+        CallResult result;
+        bool struck = false;
+        {
+            const test::AllocationFailure failure(on, n);
+            try {
+                result.returnValue =
+                    m_requests.invokeMethod(m_service, "InstallFromURI", m_arguments).returnValue;
+            } catch (const std::exception& error) {
+                result.error = error.what();
+            }
+            // A worker that was started goes on, whatever its request came to.
+            while (on == On::OtherThreads && !claim().empty())
+                std::this_thread::yield();
+            struck = failure.hasStruck();
+        }
+        deleteJobs();
+        if (!claim().empty()) {
+            // Kept by a failure that is no refusal, and by nothing else.
+            EXPECT_FALSE(releases);
+            EXPECT_EQ(claim(), "eth0");
+            EXPECT_TRUE(result.returnValue == 2U || !result.error.empty()) << result.returnValue;
+            setClaim("");
+        }
+        const std::string flash = test::describeRom(m_adapters->flashContent("eth0"));
+        EXPECT_TRUE(flash == "IMG_PXE 2, IMG_UEFI 1" || flash == m_old) << flash;
+        EXPECT_TRUE(struck || result.returnValue == kJobStarted) << result.error;
+        m_isTold = m_isTold || result.returnValue == kInsufficientMemory;
+        return struck;
+    }
+    void failEverywhere(On on, std::uint64_t step, bool releases) {
+        // What is built once and kept, exists from here on.
+        m_config.initialize();
+        for (int i = 0; i < 2; ++i)
+            failAt(on, 1U << 30, releases);
+        const std::int64_t before = test::liveBytes();
+        std::uint64_t n = 1;
+        for (; failAt(on, n, releases); n += step)
+            ASSERT_FALSE(HasFailure()) << "at allocation " << n;
+        EXPECT_GT(n, on == On::ThisThread ? 200U : 20U);
+        EXPECT_EQ(test::liveBytes(), before);
+        test::count("allocations failed", (n - 1) / step);
+        expectUpdateWorks();
+    }
 
     bool m_isTold = false;  ///< by a return value, that memory ran out
     const std::string m_image = goodImage();
@@ -30,52 +72,6 @@ class AllocationTest : public test::UpdateTest {
         test::codesArgument("InstallOptions", {5, 32768}),
         test::textsArgument("InstallOptionsValues", {"", "IMG_PXE+IMG_UEFI"})};
 };
-
-bool AllocationTest::failAt(On on, std::uint64_t n, bool releases) {
-    CallResult result;
-    bool struck = false;
-    {
-        const test::AllocationFailure failure(on, n);
-        try {
-            result.returnValue =
-                m_requests.invokeMethod(m_service, "InstallFromURI", m_arguments).returnValue;
-        } catch (const std::exception& error) {
-            result.error = error.what();
-        }
-        // A worker that was started goes on, whatever its request came to.
-        while (on == On::OtherThreads && !claim().empty())
-            std::this_thread::yield();
-        struck = failure.hasStruck();
-    }
-    deleteJobs();
-    if (!claim().empty()) {
-        // Kept by a failure that is no refusal, and by nothing else.
-        EXPECT_FALSE(releases);
-        EXPECT_EQ(claim(), "eth0");
-        EXPECT_TRUE(result.returnValue == 2U || !result.error.empty()) << result.returnValue;
-        setClaim("");
-    }
-    const std::string flash = test::describeRom(m_adapters->flashContent("eth0"));
-    EXPECT_TRUE(flash == "IMG_PXE 2, IMG_UEFI 1" || flash == m_old) << flash;
-    EXPECT_TRUE(struck || result.returnValue == kJobStarted) << result.error;
-    m_isTold = m_isTold || result.returnValue == kInsufficientMemory;
-    return struck;
-}
-
-void AllocationTest::failEverywhere(On on, std::uint64_t step, bool releases) {
-    // What is built once and kept, exists from here on.
-    m_config.initialize();
-    for (int i = 0; i < 2; ++i)
-        failAt(on, 1U << 30, releases);
-    const std::int64_t before = test::liveBytes();
-    std::uint64_t n = 1;
-    for (; failAt(on, n, releases); n += step)
-        ASSERT_FALSE(HasFailure()) << "at allocation " << n;
-    EXPECT_GT(n, on == On::ThisThread ? 200U : 20U);
-    EXPECT_EQ(test::liveBytes(), before);
-    test::count("allocations failed", (n - 1) / step);
-    expectUpdateWorks();
-}
 
 TEST_F(AllocationTest, FailingInTheRequestAndInTheWorker) {
     const test::LogLevelGuard silent(0);

@@ -23,7 +23,21 @@ class ChangingFileTest : public test::UpdateTest {
     ~ChangingFileTest() override { os::beforeFileAccess = nullptr; }
 
     /// Has the change made once, when the update gets there.
-    void arrange(When when, const std::function<void()>& change);
+    void arrange(When when, const std::function<void()>& change) {
+        m_changed = false;
+        m_accesses = 0;
+        const auto changeOnce = [this, change] {
+            if (!std::exchange(m_changed, true)) change();
+        };
+        m_backend->hook = [=](const std::string& called) {
+            const char* const step = when == When::BeforeWrite ? "writeFlashImage" : "prepareFlashImage";
+            if (when >= When::BeforePreparation && called == step) changeOnce();
+        };
+        m_atAccess = [=](int access) {
+            if (access == static_cast<int>(when)) changeOnce();
+        };
+        os::beforeFileAccess = [](const std::string&) { m_atAccess(++m_accesses); };
+    }
     CallResult installAndEnd(const std::string& uri) {
         CallResult result = install(uri, "eth0");
         EXPECT_TRUE(!result.job || state(waitForEnd(*result.job)) == JobStateCompleted);
@@ -38,22 +52,6 @@ class ChangingFileTest : public test::UpdateTest {
     static inline std::function<void(int access)> m_atAccess;
     const std::string m_path = m_folder / "image.rom";
 };
-
-void ChangingFileTest::arrange(When when, const std::function<void()>& change) {
-    m_changed = false;
-    m_accesses = 0;
-    const auto changeOnce = [this, change] {
-        if (!std::exchange(m_changed, true)) change();
-    };
-    m_backend->hook = [=](const std::string& called, const std::string&) {
-        const char* const step = when == When::BeforeWrite ? "writeFlashImage" : "prepareFlashImage";
-        if (when >= When::BeforePreparation && called == step) changeOnce();
-    };
-    m_atAccess = [=](int access) {
-        if (access == static_cast<int>(when)) changeOnce();
-    };
-    os::beforeFileAccess = [](const std::string&) { m_atAccess(++m_accesses); };
-}
 
 TEST_F(ChangingFileTest, WhatWasReadAndVerifiedIsWrittenWholeOrNothingIs) {
     auto longer = rom(3);

@@ -1,8 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 // The file system of the image stops answering.
-#include <condition_variable>
+#include <atomic>
 #include <filesystem>
-#include <mutex>
 #include <thread>
 
 #include "Providers/SoftwareUpdate/UpdateTest.h"
@@ -11,50 +10,33 @@
 
 namespace {
 
-/// Counts the accesses to one path, and holds one of them until the end of the scope, or until answer().
-class HungFileSystem {
-  public:
-    explicit HungFileSystem(const std::string& path, int heldAccess = 0) {
-        m_path = path;
-        m_heldAccess = heldAccess;
-        m_accesses = 0;
-        os::beforeFileAccess = &HungFileSystem::access;
-    }
-    HungFileSystem(const HungFileSystem&) = delete;
-    HungFileSystem& operator=(const HungFileSystem&) = delete;
-    ~HungFileSystem() {
-        answer();
-        os::beforeFileAccess = nullptr;
-    }
-    static int accesses() {
-        const std::lock_guard lock(m_mutex);
-        return m_accesses;
-    }
-    static void answer() {
-        const std::lock_guard lock(m_mutex);
-        m_heldAccess = 0;
-        m_answered.notify_all();
-    }
-
-  private:
-    static void access(const std::string& path) {
-        std::unique_lock lock(m_mutex);
-        if (path != m_path) return;
-        const int number = ++m_accesses;
-        m_answered.wait(lock, [number] { return m_heldAccess != number; });
-    }
-
-    static inline std::mutex m_mutex;
-    static inline std::condition_variable m_answered;
-    static inline std::string m_path;
-    static inline int m_heldAccess = 0;
-    static inline int m_accesses = 0;
-};
-
+/// Counts the accesses to the image, and holds the one with a chosen number.
 class HungFileTest : public test::UpdateTest {
   protected:
+    HungFileTest() {
+        m_path = m_uri.substr(std::string("file://").size());
+        m_accesses = 0;
+        os::beforeFileAccess = [](const std::string& path) {
+            if (path != m_path) return;
+            const int number = ++m_accesses;
+            m_held.wait(number);
+        };
+    }
+    ~HungFileTest() override { os::beforeFileAccess = nullptr; }
+
+    /// Lets the file system answer, and waits until it has.
+    void answer() const {
+        m_held = 0;
+        m_held.notify_all();
+        while (install(m_uri, "eth0").returnValue != 4096U)
+            std::this_thread::yield();
+        deleteJobs();
+    }
+
     const std::string m_uri = goodImage();
-    const std::string m_path = m_uri.substr(std::string("file://").size());
+    static inline std::string m_path;
+    static inline std::atomic<int> m_accesses{0};
+    static inline std::atomic<int> m_held{0};
 };
 
 TEST_F(HungFileTest, EndsTheUpdateAsAReadErrorAndLetsOthersGoOn) {
@@ -62,24 +44,20 @@ TEST_F(HungFileTest, EndsTheUpdateAsAReadErrorAndLetsOthersGoOn) {
     // The look at it, the opening, the reading.
     for (const int held : {1, 2, 3}) {
         SCOPED_TRACE(held);
-        const HungFileSystem files(m_path, held);
+        m_accesses = 0;
+        m_held = held;
         test::SyslogCapture::clear();
         EXPECT_EQ(install(m_uri, "eth0").returnValue, 2U);
         EXPECT_TRUE(test::SyslogCapture::contains("Image read error: " + m_uri + " (" + m_path + ")"));
         EXPECT_TRUE(test::SyslogCapture::contains("did not answer for 1 seconds"));
         EXPECT_EQ(claim(), "");
         // Nobody asks again, by whatever name, while the first one hangs.
-        const int accesses = HungFileSystem::accesses();
-        EXPECT_EQ(accesses, held);
         EXPECT_EQ(install("file:///." + m_path, "eth0").returnValue, 2U);
-        EXPECT_EQ(HungFileSystem::accesses(), accesses);
+        EXPECT_EQ(m_accesses, held);
         EXPECT_EQ(install(file("other.rom", test::readTestFile(m_path)), "eth0").returnValue, 4096U);
         deleteJobs();
 
-        HungFileSystem::answer();
-        while (install(m_uri, "eth0").returnValue != 4096U)
-            std::this_thread::yield();
-        deleteJobs();
+        answer();
         test::count("images on a file system that hung");
     }
 }
@@ -90,17 +68,17 @@ TEST_F(HungFileTest, KnowsOneFileFromAnotherBehindALink) {
     std::filesystem::create_directory_symlink("away/below", m_folder / "link");
     const std::string name = std::filesystem::path(m_path).filename();
     m_folder.write("away/" + name, test::readTestFile(m_path));
-    const HungFileSystem files(m_path, 1);
+    m_held = 1;
     EXPECT_EQ(install(m_uri, "eth0").returnValue, 2U);
     EXPECT_EQ(install("file://" + (m_folder / "link/../") + name, "eth0").returnValue, 4096U);
+    answer();
 }
 
 TEST_F(HungFileTest, ReadsNoImageThatIsLargerThanAllowed) {
     const std::string length = std::to_string(test::readTestFile(m_path).size());
-    const HungFileSystem files(m_path);
     m_folder.write("quenx.conf", "LargestImage=512\n");
     EXPECT_EQ(install(m_uri, "eth0").returnValue, 2U);
-    EXPECT_EQ(HungFileSystem::accesses(), 2) << "it was read";
+    EXPECT_EQ(m_accesses, 2) << "it was read";
     EXPECT_EQ(claim(), "");
     EXPECT_TRUE(test::SyslogCapture::contains(m_path + " has " + length + " bytes, more than the 512"));
     m_folder.write("quenx.conf", "LargestImage=" + length + "\n");

@@ -125,7 +125,33 @@ class UpdatePowerLossTest : public test::UpdateTest {
     }
 
     /// Loses the power at the k-th call of an update. False when the update made fewer.
-    bool cutAt(int k, bool updatedBefore, const Medium& medium) const;
+    bool cutAt(int k, bool updatedBefore, const Medium& medium) const {
+        const test::TempFolder folder;
+        const std::string root = folder.path();
+        const auto before = powerOn(root, std::make_shared<test::UnsyncedFiles>());
+        if (updatedBefore) waitForEnd(*install(m_first, "eth0").job);
+        const std::vector<uint8_t> old = before->flashContent("eth0");
+
+        const auto files = std::make_shared<CutFiles>(k, root);
+        powerOn(root, files);
+        const CallResult update = install(m_image, "eth0");
+        EXPECT_EQ(update.returnValue, 4096U) << update.error;
+        if (!update.job) return false;
+        const core::InstanceValue job = waitForEnd(*update.job);
+        const bool finished = state(job) == JobStateCompleted;
+        EXPECT_EQ(finished, !files->wasCut());
+        EXPECT_EQ(text(job, "ErrorCode"), finished ? "0" : "4");
+        EXPECT_EQ(claim(), "");
+
+        files->lose(medium, root);
+        const auto after = powerOn(root, std::make_shared<test::UnsyncedFiles>());
+        const std::vector<uint8_t> found = after->flashContent("eth0");
+        EXPECT_TRUE(found == m_new || (!finished && found == old)) << test::describeRom(found);
+        expectUpdateWorks();
+        EXPECT_EQ(test::describeRom(after->flashContent("eth0")), "IMG_PXE 2, IMG_UEFI 1");
+        deleteJobs();
+        return files->wasCut();
+    }
 
     /// Of a length that takes several chunks.
     const std::vector<uint8_t> m_new = ma::mergeOptionRoms(ma::makeRomImage({.type = FirmwareType::PXE,
@@ -139,34 +165,6 @@ class UpdatePowerLossTest : public test::UpdateTest {
         file("first.rom", test::madeRom({{FirmwareType::PXE, 1}, {FirmwareType::UEFI, 1}}));
     const std::string m_image = file("new.rom", m_new);
 };
-
-bool UpdatePowerLossTest::cutAt(int k, bool updatedBefore, const Medium& medium) const {
-    const test::TempFolder folder;
-    const std::string root = folder.path();
-    const auto before = powerOn(root, std::make_shared<test::UnsyncedFiles>());
-    if (updatedBefore) waitForEnd(*install(m_first, "eth0").job);
-    const std::vector<uint8_t> old = before->flashContent("eth0");
-
-    const auto files = std::make_shared<CutFiles>(k, root);
-    powerOn(root, files);
-    const CallResult update = install(m_image, "eth0");
-    EXPECT_EQ(update.returnValue, 4096U) << update.error;
-    if (!update.job) return false;
-    const core::InstanceValue job = waitForEnd(*update.job);
-    const bool finished = state(job) == JobStateCompleted;
-    EXPECT_EQ(finished, !files->wasCut());
-    EXPECT_EQ(number(job, "ErrorCode"), finished ? 0U : 4U);
-    EXPECT_EQ(claim(), "");
-
-    files->lose(medium, root);
-    const auto after = powerOn(root, std::make_shared<test::UnsyncedFiles>());
-    const std::vector<uint8_t> found = after->flashContent("eth0");
-    EXPECT_TRUE(found == m_new || (!finished && found == old)) << test::describeRom(found);
-    expectUpdateWorks();
-    EXPECT_EQ(test::describeRom(after->flashContent("eth0")), "IMG_PXE 2, IMG_UEFI 1");
-    deleteJobs();
-    return files->wasCut();
-}
 
 TEST_F(UpdatePowerLossTest, LeavesAWholeImageAndAnAdapterThatCanBeUpdated) {
     const test::LogLevelGuard silent(0);

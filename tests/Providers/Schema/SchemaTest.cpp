@@ -23,8 +23,10 @@ class SchemaTest : public ::testing::Test {
         std::map<std::string, const core::CimClassInfo*> classes;
         for (const core::AgentUse& use : core::GetCimBroker()->useAgents()) {
             for (const core::ServedClass* served : use.agent().getClasses().getAll()) {
-                for (const auto* info = served->info; info != nullptr; info = info->superclass)
-                    if (std::string(info->name).starts_with("CIM_")) classes[info->name] = info;
+                EXPECT_EQ(served->info->isAssociation, served->info->superclass->isAssociation)
+                    << served->name;
+                for (const auto* info = served->info->superclass; info != nullptr; info = info->superclass)
+                    classes[info->name] = info;
             }
         }
         EXPECT_EQ(classes.size(), 31U);
@@ -78,21 +80,58 @@ TEST_F(SchemaTest, RepeatsAllPropertiesOfASuperclassOrNoneAndServesTheLast) {
     }
 }
 
-/// A text for an element that the class does not declare would reach no client.
-TEST_F(SchemaTest, DescribesOnlyWhatItsClassesDeclare) {
+/// What may have qualifiers, by its name in the schema's texts.
+struct Element {
+    std::string name;
+    std::string_view scope;
+    const std::vector<core::Qualifier>& qualifiers;
+};
+
+std::vector<Element> elementsOf(const core::ClassDeclaration& declaration) {
+    std::vector<Element> all{
+        {"", declaration.isAssociation ? "ASSOCIATION" : "CLASS", declaration.qualifiers}};
+    for (const core::PropertyDeclaration& property : declaration.properties)
+        all.push_back(
+            {property.name, property.referenceClass.empty() ? "PROPERTY" : "REFERENCE", property.qualifiers});
+    for (const core::MethodDeclaration& method : declaration.methods) {
+        all.push_back({method.name, "METHOD", method.qualifiers});
+        for (const core::ParameterDeclaration& parameter : method.parameters)
+            all.push_back({method.name + "." + parameter.name, "PARAMETER", parameter.qualifiers});
+    }
+    return all;
+}
+
+TEST_F(SchemaTest, DescribesAndQualifiesWhatItDeclaresByWhatIsDeclared) {
+    const auto& declarations = core::qualifierDeclarations();
+    Names used;
     for (const auto& [name, info] : allClasses()) {
         const auto declaration = core::declarationsOf(*info).front();
-        Names elements{""};
-        for (const core::PropertyDeclaration& property : declaration->properties)
-            elements.insert(property.name);
-        for (const core::MethodDeclaration& method : declaration->methods) {
-            elements.insert(method.name);
-            for (const core::ParameterDeclaration& parameter : method.parameters)
-                elements.insert(method.name + "." + parameter.name);
+        Names elements;
+        for (const Element& element : elementsOf(*declaration)) {
+            elements.insert(element.name);
+            for (const core::Qualifier& one : element.qualifiers) {
+                SCOPED_TRACE(one.name + " of " + name + "." + element.name);
+                const auto* declared = core::findByName(declarations, one.name);
+                ASSERT_NE(declared, nullptr);
+                EXPECT_EQ(one.value.type, declared->defaultValue.type);
+                EXPECT_EQ(one.value.isArray, declared->defaultValue.isArray);
+                EXPECT_EQ(std::ranges::count(declared->scopes, element.scope), 1);
+                used.insert(one.name);
+            }
         }
+        // A text for anything else would reach no client.
         for (const core::CimElementText& text : info->texts)
             EXPECT_TRUE(elements.contains(text.element)) << name << "." << text.element;
     }
+    std::string table;
+    for (const core::QualifierDeclaration& one : declarations) {
+        EXPECT_TRUE(used.contains(one.name)) << one.name;
+        table += one.name + " " + core::valueText(one.defaultValue) + (one.isOverridable ? "" : "!") +
+                 (one.isInherited ? "" : "-") + (one.isTranslatable ? "~, " : ", ");
+    }
+    EXPECT_EQ(table,
+              "Association FALSE!, Description ~, In TRUE!, Key FALSE!, Out FALSE!, Override -, ValueMap , "
+              "Values ~, ");
 }
 
 }  // namespace

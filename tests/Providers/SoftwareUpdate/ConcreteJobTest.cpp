@@ -8,6 +8,7 @@
 #include "Providers/SoftwareUpdate/Quenx_ConcreteJobClass.h"
 #include "Providers/SoftwareUpdate/UpdateTest.h"
 #include "Support/TestRoms.h"
+#include "Support/Together.h"
 
 namespace {
 
@@ -36,7 +37,7 @@ class ConcreteJobTest : public test::UpdateTest {
 
 TEST_F(ConcreteJobTest, StartsNewAndIsStartedOnce) {
     std::atomic<int> asked{0};
-    m_backend->hook = [&](const std::string& operation, const std::string&) {
+    m_backend->hook = [&](const std::string& operation) {
         if (operation == "getFlashImageUpdateProgress") ++asked;
     };
     const auto job = makeJob();
@@ -63,11 +64,37 @@ TEST_F(ConcreteJobTest, StartsNewAndIsStartedOnce) {
     EXPECT_TRUE(test::SyslogCapture::contains("Cannot start job that is not in 'NEW' state"));
 }
 
+TEST_F(ConcreteJobTest, MayBeUsedByAnyThreadAtOnce) {
+    for (int round = 0; round < 10; ++round) {
+        const auto job = makeJob();
+        std::atomic<int> started{0};
+        const auto start = [&] {
+            if (job->requestStateChange(RequestedStateStart, utils::Time()) == 0) ++started;
+        };
+        std::vector<std::function<void()>> operations = {
+            [&] { job->refresh(); },
+            [&] { job->getFlashImage(); },
+            [&] { job->getFlashImageSize(); },
+            [&] { job->getJobState(); },
+            [&] { job->getPercentComplete(); },
+            [&] { job->setLastError(7, "a text that is long enough to be allocated"); },
+            [&] { job->threadControl(ThreadTerminate, 0); },
+            start,
+            start,
+        };
+        test::together(operations);
+        EXPECT_EQ(started, 1);
+        while (!job->threadControl(ThreadDispose, 0))
+            utils::Thread::msleep(2);
+        operations.resize(6);
+        operations.emplace_back([&] { job->setJobState(JobStateException); });
+        test::together(operations);
+    }
+}
+
 TEST_F(ConcreteJobTest, TheBootTypeStaysUnlessAnUpdateRemovesIscsi) {
     // The update that removes it is in the fault table.
-    m_backend->hook = [](const std::string& operation, const std::string&) {
-        EXPECT_NE(operation, "setBootType");
-    };
+    m_backend->hook = [](const std::string& operation) { EXPECT_NE(operation, "setBootType"); };
     const auto iscsi = madeRom({{FirmwareType::iSCSI, 2}, {FirmwareType::UEFI, 1}}, 0x15ad, 0x07b0);
     run(*makeJob("eth4", file("iscsi.rom", iscsi)));
     run(*makeJob());

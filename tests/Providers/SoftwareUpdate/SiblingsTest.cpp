@@ -4,7 +4,7 @@
 
 #include <stdexcept>
 
-#include "Framework/Classes/CimBroker.h"
+#include "Providers/ClassObjects.h"
 #include "Providers/Schema/CIM_PortController.h"
 #include "Providers/Schema/ProviderInterfaces.h"
 #include "Providers/SoftwareUpdate/UpdateTest.h"
@@ -14,13 +14,15 @@ namespace {
 /// Sits elsewhere than the ports that it holds: eth0 and eth1.
 class OtherController : public CIM_PortController, public inventory::PortController {
   public:
+    static constexpr core::CimClassInfo classInfo{"Quenx_PortController", &CIM_PortController::classInfo};
     static inline bool isFailing = false;
 
     OtherController() {
         for (auto* key : {&SystemCreationClassName, &SystemName, &CreationClassName, &DeviceID, &Name})
             *key = "other";
     }
-    std::string getClassName() const override { return "Quenx_PortController"; }
+    std::string getClassName() const override { return classInfo.name; }
+    void refresh() {}
     utils::PCIAddr getPCIAddress() const override { return {0x40, 0, 0, true, ""}; }
     bool holds(const utils::PCIAddr& address) const override {
         if (isFailing) throw std::runtime_error("out of order");
@@ -28,23 +30,11 @@ class OtherController : public CIM_PortController, public inventory::PortControl
     }
 };
 
-class OtherControllerClass : public core::CimClass {
-  public:
-    OtherControllerClass() { m_instances.add(new OtherController); }
-    std::string getClassName() override { return "Quenx_PortController"; }
-    utils::SafeList<core::CimInstance*>::Iterator getInstances() override {
-        return m_instances.getElements(false);
-    }
-
-  private:
-    core::InstanceList m_instances;
-};
-
 class OtherAgent : public core::CimAgent {
   public:
     OtherAgent() : CimAgent("Other") {
         core::GetCimBroker()->addAgent(this);
-        m_classes.add(new OtherControllerClass);
+        m_classes.add(new SingletonClass<OtherController>("Other", __FILE__, __LINE__));
     }
     ~OtherAgent() override { leaveBroker(); }
 };

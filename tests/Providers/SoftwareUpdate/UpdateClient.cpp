@@ -13,7 +13,7 @@ using core::CimValue;
 
 core::CimPath UpdateClient::pathNamed(const std::string& className, const std::string& name) const {
     for (const core::InstanceValue& instance : m_requests.enumerateInstances(className)) {
-        if (text(instance, "Name") == name) return instance.path;
+        if (instance.text("Name") == name) return instance.path;
     }
     ADD_FAILURE() << "no " << className << " is named " << name;
     return {};
@@ -26,10 +26,8 @@ CallResult UpdateClient::call(const std::string& method, const std::vector<Argum
         result.returnValue = answer.returnValue;
         for (const Argument& output : answer.outputs) {
             if (output.name == "Job") result.job = std::get<core::CimPath>(*output.value.scalar());
-            if (output.name != "InstallCharacteristics") continue;
-            for (const CimScalar& code : *output.value.elements()) {
-                result.characteristics.push_back(static_cast<std::uint16_t>(std::get<std::uint64_t>(code)));
-            }
+            if (output.name == "InstallCharacteristics")
+                result.characteristics = core::valueText(output.value);
         }
     } catch (const core::CimError& error) {
         result.error = error.what();
@@ -61,29 +59,24 @@ bool UpdateClient::hasEnded(const core::InstanceValue& job) {
     return state(job) == 7U || state(job) == 10U;  // completed, or exception
 }
 
-std::uint32_t UpdateClient::number(const core::InstanceValue& instance, const char* property) {
-    return static_cast<std::uint32_t>(std::get<std::uint64_t>(*instance.find(property)->value.scalar()));
-}
-
 std::string UpdateClient::text(const core::InstanceValue& instance, const char* property) {
     const core::PropertyValue* found = instance.find(property);
-    if (found == nullptr || found->value.isNull()) return {};
-    if (!found->value.isArray) return core::scalarText(*found->value.scalar());
-    std::string joined;
-    for (const CimScalar& element : *found->value.elements())
-        joined += (joined.empty() ? "" : ", ") + core::scalarText(element);
-    return joined;
+    return found == nullptr ? "" : core::valueText(found->value);
+}
+
+std::string UpdateClient::row(const core::InstanceValue& instance,
+                              const std::vector<const char*>& properties) {
+    std::string texts;
+    for (const char* property : properties)
+        texts += (property == properties.front() ? "" : "; ") + text(instance, property);
+    return texts;
 }
 
 std::vector<std::string> UpdateClient::table(const std::string& className,
                                              const std::vector<const char*>& properties) const {
     std::vector<std::string> rows;
-    for (const core::InstanceValue& instance : m_requests.enumerateInstances(className)) {
-        std::string row;
-        for (const char* property : properties)
-            row += (property == properties.front() ? "" : "; ") + text(instance, property);
-        rows.push_back(row);
-    }
+    for (const core::InstanceValue& instance : m_requests.enumerateInstances(className))
+        rows.push_back(row(instance, properties));
     return rows;
 }
 

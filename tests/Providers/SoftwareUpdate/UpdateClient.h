@@ -16,7 +16,7 @@ struct CallResult {
     unsigned int returnValue = 0;
     std::string error;  ///< the text of the CIM error; the return value means nothing then
     std::optional<core::CimPath> job;
-    std::vector<std::uint16_t> characteristics;
+    std::string characteristics;
 };
 
 /// A client of the providers that this process serves: speaks through the request layer only, and so needs
@@ -41,12 +41,13 @@ class UpdateClient {
     /// Follows the job to its end; fails the test when it takes too long.
     core::InstanceValue waitForEnd(const core::CimPath& job) const;
 
-    static std::uint32_t state(const core::InstanceValue& job) { return number(job, "JobState"); }
+    static std::uint64_t state(const core::InstanceValue& job) { return job.number("JobState"); }
     static bool hasEnded(const core::InstanceValue& job);
-    static std::uint32_t number(const core::InstanceValue& instance, const char* property);
-    /// A property as text, an array's elements joined by ", "; empty when it is null or not there.
+    /// A property as text, an array's elements joined by commas; empty when it is null or not there.
     static std::string text(const core::InstanceValue& instance, const char* property);
-    /// For each instance of the class, the properties' texts, separated by "; ".
+    /// The properties' texts, separated by "; ".
+    static std::string row(const core::InstanceValue& instance, const std::vector<const char*>& properties);
+    /// The row of each instance of the class.
     std::vector<std::string> table(const std::string& className,
                                    const std::vector<const char*>& properties) const;
 
