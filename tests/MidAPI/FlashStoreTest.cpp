@@ -124,20 +124,16 @@ class ImpatientFiles : public test::UnsyncedFiles {
 };
 
 TEST_F(FlashStoreTest, GivesUpOnARecordThatSomebodyHoldsAndSaysWho) {
-    fs::create_directories(path(""));
-    const os::FileLock held(path("state.lock"));
-    const auto impatient =
-        std::make_shared<ma::Simulator>(ma::parseAdapterDescriptions(test::kTestAdapters, ""),
-                                        m_adapters.stateDirectory(), std::make_shared<ImpatientFiles>());
-    const auto patient = ma::setBackend(impatient);
+    const test::SimulatedAdapters impatient(test::kTestAdapters, std::make_shared<ImpatientFiles>());
+    fs::create_directories(impatient.stateDirectory() + "/eth0");
+    const os::FileLock held(impatient.stateDirectory() + "/eth0/state.lock");
     const test::WriteResult result = test::writeImage("eth0", test::madeRom({{PXE, 2}}));
     EXPECT_EQ(result.code, ma::WriteError::Busy);
     EXPECT_TRUE(result.text.starts_with("this process (" + std::to_string(::getpid()) + ") holds " +
-                                        path("state.lock")))
+                                        impatient.stateDirectory()))
         << result.text;
     EXPECT_EQ(test::componentsOf("eth0"), "IMG_PXE 1, IMG_UEFI 0");
     EXPECT_TRUE(test::writeImage("eth1", test::madeRom({{PXE, 2}})).done) << "another adapter is free";
-    ma::setBackend(patient);
 }
 
 TEST_F(FlashStoreTest, ClosesItsFilesToOtherUsers) {

@@ -5,7 +5,6 @@
 #include <unistd.h>
 
 #include <algorithm>
-#include <atomic>
 #include <cstdlib>
 #include <filesystem>
 #include <fstream>
@@ -111,13 +110,14 @@ TEST(SimulatorTest, KeepsPrintableNamesOfAnyKindApart) {
 }
 
 /// Looks at the progress from within every step of a write.
-class WatchedFiles : public ma::FlashFiles {
+class WatchedFiles : public test::UnsyncedFiles {
   public:
     void write(int descriptor, std::span<const std::uint8_t> bytes) override {
         FlashFiles::write(descriptor, bytes);
         // From another thread, and with a prepare in between: neither may disturb the write.
         std::thread([this] { seen.push_back(ma::getFlashImageUpdateProgress("eth0")); }).join();
-        const Rom rom = test::madeRom({{PXE, 1}});
+        EXPECT_EQ(booted, test::componentsOf("eth0")) << "half an update was seen";
+        const Rom rom = test::madeRom({{PXE, 9}});
         EXPECT_EQ(0, test::prepareImage("eth0", rom).status);
         const test::WriteResult second = test::writeImage("eth0", rom);
         EXPECT_EQ("adapter eth0 is being written to by this process (" + std::to_string(::getpid()) +
@@ -125,16 +125,15 @@ class WatchedFiles : public ma::FlashFiles {
                   second.text);
     }
 
+    std::string booted = "IMG_PXE 1, IMG_UEFI 0";
     std::vector<std::uint16_t> seen;
 };
 
 TEST(SimulatorTest, MovesProgressOnlyForward) {
-    const test::TempFolder folder;
     const auto files = std::make_shared<WatchedFiles>();
-    const auto simulator = std::make_shared<ma::Simulator>(
-        ma::parseAdapterDescriptions(test::kTestAdapters, ""), folder.path(), files);
-    const auto previous = ma::setBackend(simulator);
-    const test::PreparedImage prepared = test::prepareImage("eth0", test::realRom("pxe-virtio"));
+    const test::SimulatedAdapters adapters(test::kTestAdapters, files);
+    const Rom newer = test::withRevision(test::realRom("pxe-virtio"), 2);
+    const test::PreparedImage prepared = test::prepareImage("eth0", newer);
     EXPECT_EQ(0, ma::getFlashImageUpdateProgress("eth0"));
     EXPECT_TRUE(test::writeImage("eth0", prepared.image).done);
     EXPECT_EQ(100, ma::getFlashImageUpdateProgress("eth0"));
@@ -142,32 +141,13 @@ TEST(SimulatorTest, MovesProgressOnlyForward) {
     EXPECT_LT(15, std::set<std::uint16_t>(files->seen.begin(), files->seen.end()).size());
     EXPECT_EQ(99, files->seen.back()) << "100 only when it is in force";
 
-    simulator->injectFault("eth0", {.percent = 50, .code = 1, .text = "worn out", .once = true});
-    EXPECT_EQ(0, test::prepareImage("eth0", test::realRom("pxe-virtio")).status);
+    adapters->injectFault("eth0", {.percent = 50, .code = 1, .text = "worn out", .once = true});
+    files->booted = "IMG_PXE 2, IMG_UEFI 0";
+    EXPECT_EQ(0, test::prepareImage("eth0", newer).status);
     EXPECT_EQ(0, ma::getFlashImageUpdateProgress("eth0"));
     EXPECT_FALSE(test::writeImage("eth0", prepared.image).done);
     EXPECT_NEAR(54, ma::getFlashImageUpdateProgress("eth0"), 5);
     EXPECT_TRUE(test::writeImage("eth0", prepared.image).done);
-    ma::setBackend(previous);
-}
-
-TEST(SimulatorTest, UpdatesAndReadsPortsAtOnce) {
-    const test::SimulatedAdapters adapters;
-    std::atomic<int> running = 2;
-    std::vector<std::jthread> threads;
-    for (const char* name : {"eth0", "eth1"})
-        threads.emplace_back([&running, name] {
-            for (std::uint16_t revision = 1; revision <= 8; ++revision)
-                EXPECT_TRUE(install(name, test::madeRom({{PXE, revision}})).done);
-            --running;
-        });
-    while (running > 0)
-        for (const std::string& name : ma::enumerateAdapters()) {
-            EXPECT_GE(100, ma::getFlashImageUpdateProgress(name));
-            EXPECT_FALSE(ma::getAdapterInfo(name).components.empty()) << "half an update was seen";
-        }
-    EXPECT_EQ("IMG_PXE 8, IMG_UEFI 0", test::componentsOf("eth0"));
-    EXPECT_EQ("IMG_PXE 8, IMG_UEFI 0", test::componentsOf("eth1"));
 }
 
 TEST(BackendTest, IsChosenByCallThenEnvironment) {

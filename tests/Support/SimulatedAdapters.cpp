@@ -19,7 +19,8 @@ const char* const kTestAdapters = R"(adapter = [
 ]
 )";
 
-SimulatedAdapters::SimulatedAdapters(std::string_view description) {
+SimulatedAdapters::SimulatedAdapters(std::string_view description, std::shared_ptr<ma::FlashFiles> files)
+    : m_files(std::move(files)) {
     m_folder.write("adapters.toml", description);
     m_simulator = makeSimulator();
     m_previous = ma::setBackend(m_simulator);
@@ -27,7 +28,7 @@ SimulatedAdapters::SimulatedAdapters(std::string_view description) {
 
 std::shared_ptr<ma::Simulator> SimulatedAdapters::makeSimulator() const {
     return std::make_shared<ma::Simulator>(ma::loadAdapterDescriptions(descriptionFile()), stateDirectory(),
-                                           std::make_shared<UnsyncedFiles>());
+                                           m_files);
 }
 
 SimulatedAdapters::~SimulatedAdapters() {

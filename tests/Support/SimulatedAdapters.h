@@ -33,7 +33,8 @@ class UnsyncedFiles : public ma::FlashFiles {
 class SimulatedAdapters {
   public:
     /// @param description  the text of an adapter description
-    explicit SimulatedAdapters(std::string_view description = kTestAdapters);
+    explicit SimulatedAdapters(std::string_view description = kTestAdapters,
+                               std::shared_ptr<ma::FlashFiles> files = std::make_shared<UnsyncedFiles>());
     SimulatedAdapters(const SimulatedAdapters&) = delete;
     SimulatedAdapters& operator=(const SimulatedAdapters&) = delete;
     ~SimulatedAdapters();
@@ -53,6 +54,7 @@ class SimulatedAdapters {
     std::shared_ptr<ma::Simulator> makeSimulator() const;
 
     TempFolder m_folder;
+    std::shared_ptr<ma::FlashFiles> m_files;
     std::shared_ptr<ma::Simulator> m_simulator;
     std::shared_ptr<ma::Backend> m_previous;
 };

@@ -29,8 +29,7 @@ Store& store() {
     return *instance;
 }
 
-void record(int priority, const char* format, va_list arguments) __attribute__((format(printf, 2, 0)));
-void record(int priority, const char* format, va_list arguments) {
+[[gnu::format(printf, 2, 0)]] void record(int priority, const char* format, va_list arguments) {
     const int callersErrno = errno;
     char buffer[8192];
     vsnprintf(buffer, sizeof buffer, format, arguments);
@@ -109,9 +108,7 @@ QUENX_EXPORT void syslog(int priority, const char* format, ...) {
     va_end(arguments);
 }
 
-QUENX_EXPORT void __syslog_chk(int priority, int, const char* format, ...)
-    __attribute__((format(printf, 3, 4)));
-QUENX_EXPORT void __syslog_chk(int priority, int, const char* format, ...) {
+[[gnu::format(printf, 3, 4)]] QUENX_EXPORT void __syslog_chk(int priority, int, const char* format, ...) {
     va_list arguments;
     va_start(arguments, format);
     test::record(priority, format, arguments);

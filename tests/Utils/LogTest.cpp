@@ -29,11 +29,6 @@ using Texts = std::vector<std::string>;
 
 namespace {
 
-/// A null value unsets it.
-void setVariable(const char* name, const char* value) {
-    value == nullptr ? unsetenv(name) : setenv(name, value, 1);
-}
-
 /// Logs an error so many calls deeper, and returns the callers of the function that logs, nearest first.
 [[gnu::noinline]] Frames logDeeper(int calls, bool byFormat) {
     if (calls > 0) return logDeeper(calls - 1, byFormat);
@@ -56,7 +51,7 @@ TEST(LogTest, OpensAsTheEnvironmentSays) {
         const char* copy;
         int foundLevel;
         int foundOptions;
-    } rows[] = {{nullptr, nullptr, 1, LOG_CONS},
+    } rows[] = {{nullptr, nullptr, 1, LOG_CONS},  // as it is at first
                 {"", "", 1, LOG_CONS},
                 {"3", "stderr", 1, LOG_PERROR},
                 {"00", "stderr2", 0, LOG_CONS},
@@ -64,8 +59,8 @@ TEST(LogTest, OpensAsTheEnvironmentSays) {
     for (const auto& row : rows) {
         SyslogCapture::clear();
         utils::logLevel = -1;
-        setVariable("TARVEL_SMASHv2_LOG_LEVEL", row.level);
-        setVariable("QUENX_LOG", row.copy);
+        if (row.level != nullptr) setenv("TARVEL_SMASHv2_LOG_LEVEL", row.level, 1);
+        if (row.copy != nullptr) setenv("QUENX_LOG", row.copy, 1);
         utils::writeDebugLog("f", "g", 1, "debug text");
         utils::writeErrorLog("f", "g", 1, "error text");
 

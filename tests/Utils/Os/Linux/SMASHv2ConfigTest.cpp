@@ -28,25 +28,30 @@ struct SMASHv2ConfigTest : ::testing::Test {
 TEST_F(SMASHv2ConfigTest, ReadsAndLogsEachLine) {
     const struct {
         const char* line;
-        const char* cimNamespace;
-        std::uint32_t timeout;
-        const char* message;  // null for none
+        const char* settings;  // null for the defaults
+        const char* message;   // null for none
     } rows[] = {
-        {"namespace=root/x", "root/cimv2", 300000, nullptr},
-        {"  # Namespace=root/x", "root/cimv2", 300000, nullptr},
-        {"\tNamespace==root/x=y z", "root/x", 300000, "Read NameSpace : root/x"},
-        {"Timeout=0x1F4", "root/cimv2", 500, "Read LockerTimeout : 500"},
-        {"Timeout 42 43", "root/cimv2", 42, "Read LockerTimeout : 42"},
-        {"Timeout=0xFFFFFFFF", "root/cimv2", 4294967295U, "Read LockerTimeout : -1"},
-        {"Timeout=", "root/cimv2", 300000, "Read LockerTimeout : 300000"},
-        {"Timeout=00", "root/cimv2", 300000, "Read LockerTimeout : 300000"},
-        {"Timeout=-1", "root/cimv2", 300000, "Read LockerTimeout : 300000"},
-        {"Timeout=2147483648", "root/cimv2", 300000, "Read LockerTimeout : 300000"},
-        {"Timeout=0x100000000", "root/cimv2", 300000, "Read LockerTimeout : 300000"},
-        {"OEMCustomizeable=4x", "root/cimv2", 300000, "Read OEMCustomizeable : 4"},
-        {"OEMCustomizeable=65536", "root/cimv2", 300000, nullptr},
-        {"ReleaseClaimAfterCheck=1", "root/cimv2", 300000, nullptr},
-        {"ReleaseClaimAfterCheck=2", "root/cimv2", 300000, nullptr},
+        {"namespace=root/x", nullptr, nullptr},
+        {"  # Namespace=root/x", nullptr, nullptr},
+        {"Namespace=interop", nullptr, nullptr},
+        {"\tNamespace==root/x=y z", "root/x, 300000 ms, 30 s, 0 bytes", "Read NameSpace : root/x"},
+        {"Timeout=0x1F4", "root/cimv2, 500 ms, 30 s, 0 bytes", "Read LockerTimeout : 500"},
+        {"Timeout 42 43", "root/cimv2, 42 ms, 30 s, 0 bytes", "Read LockerTimeout : 42"},
+        {"Timeout=0xFFFFFFFF", "root/cimv2, 4294967295 ms, 30 s, 0 bytes", "Read LockerTimeout : -1"},
+        {"Timeout=", nullptr, "Read LockerTimeout : 300000"},
+        {"Timeout=00", nullptr, "Read LockerTimeout : 300000"},
+        {"Timeout=-1", nullptr, "Read LockerTimeout : 300000"},
+        {"Timeout=2147483648", nullptr, "Read LockerTimeout : 300000"},
+        {"Timeout=0x100000000", nullptr, "Read LockerTimeout : 300000"},
+        {"OEMCustomizeable=4x", nullptr, "Read OEMCustomizeable : 4"},
+        {"OEMCustomizeable=65536", nullptr, nullptr},
+        {"ReleaseClaimAfterCheck=1", nullptr, nullptr},
+        {"ReleaseClaimAfterCheck=2", nullptr, nullptr},
+        {"ImageReadTimeout=86400", "root/cimv2, 300000 ms, 86400 s, 0 bytes", nullptr},
+        {"ImageReadTimeout=0", nullptr, nullptr},
+        {"ImageReadTimeout=86401", nullptr, nullptr},
+        {"LargestImage=1048576", "root/cimv2, 300000 ms, 30 s, 1048576 bytes", nullptr},
+        {"LargestImage=1M", nullptr, nullptr},
     };
     for (const auto& row : rows) {
         write(std::string("\n \t\n") + row.line + "\nUnknown=1\n");
@@ -56,8 +61,10 @@ TEST_F(SMASHv2ConfigTest, ReadsAndLogsEachLine) {
         SCOPED_TRACE(row.line);
         EXPECT_EQ(SyslogCapture::messages(), row.message == nullptr ? Lines{} : Lines{row.message});
         EXPECT_EQ(SyslogCapture::count("(initialize@SMASHv2Config.cpp:"), row.message == nullptr ? 0U : 1U);
-        EXPECT_EQ(fresh.getNamespace(), row.cimNamespace);
-        EXPECT_EQ(fresh.getLockerTimeout(), row.timeout);
+        const auto [silence, largest] = fresh.getImageLimits();
+        EXPECT_EQ(fresh.getNamespace() + ", " + std::to_string(fresh.getLockerTimeout()) + " ms, " +
+                      std::to_string(silence.count()) + " s, " + std::to_string(largest) + " bytes",
+                  row.settings == nullptr ? "root/cimv2, 300000 ms, 30 s, 0 bytes" : row.settings);
     }
 }
 
@@ -96,17 +103,6 @@ TEST_F(SMASHv2ConfigTest, KeepsTheValueOfARemovedKeyAndTheBanOnDowngrades) {
     SyslogCapture::clear();
     EXPECT_FALSE(config.isDowngradeEnabled());
     EXPECT_EQ(SyslogCapture::messages(), Lines{});
-}
-
-TEST_F(SMASHv2ConfigTest, BoundsTheReadingOfImages) {
-    const auto limits = [this](const std::string& lines) {
-        write(lines);
-        const utils::ImageLimits found = config.getImageLimits();
-        return std::to_string(found.silence.count()) + " s, " + std::to_string(found.largest) + " bytes";
-    };
-    EXPECT_EQ(limits(""), "30 s, 0 bytes");
-    EXPECT_EQ(limits("ImageReadTimeout=0\nImageReadTimeout=86401\nLargestImage=1M\n"), "30 s, 0 bytes");
-    EXPECT_EQ(limits("ImageReadTimeout=5\nLargestImage=1048576\n"), "5 s, 1048576 bytes");
 }
 
 TEST_F(SMASHv2ConfigTest, BuildsDirectoriesAnewFromEveryLine) {
