@@ -3,7 +3,6 @@
 #include <arpa/inet.h>
 #include <gmock/gmock.h>
 #include <sys/socket.h>
-#include <unistd.h>
 
 #include <array>
 #include <atomic>
@@ -12,6 +11,7 @@
 #include <thread>
 
 #include "Cli/Connection/Connection.h"
+#include "Utils/Os/Linux/linux.h"
 
 namespace {
 
@@ -32,22 +32,16 @@ class LoopbackServer {
         address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
         socklen_t size = sizeof address;
         auto* generic = reinterpret_cast<sockaddr*>(&address);
-        EXPECT_EQ(::bind(m_socket, generic, size), 0);
-        EXPECT_EQ(::listen(m_socket, 1), 0);
-        EXPECT_EQ(::getsockname(m_socket, generic, &size), 0);
+        EXPECT_EQ(::bind(m_socket.number(), generic, size), 0);
+        EXPECT_EQ(::listen(m_socket.number(), 1), 0);
+        EXPECT_EQ(::getsockname(m_socket.number(), generic, &size), 0);
         m_port = ntohs(address.sin_port);
-        m_thread = std::thread([this] { serve(); });
+        m_thread = std::jthread([this] { serve(); });
     }
     /// Answers with this response, whatever is asked.
     explicit LoopbackServer(const std::string& response)
         : LoopbackServer([response](int client, const std::string&) { sendResponse(client, response); }) {}
-    LoopbackServer(const LoopbackServer&) = delete;
-    LoopbackServer& operator=(const LoopbackServer&) = delete;
-    ~LoopbackServer() {
-        ::shutdown(m_socket, SHUT_RDWR);
-        m_thread.join();
-        ::close(m_socket);
-    }
+    ~LoopbackServer() { ::shutdown(m_socket.number(), SHUT_RDWR); }
 
     static bool sendBytes(int client, const std::string& bytes) {
         return ::send(client, bytes.data(), bytes.size(), MSG_NOSIGNAL) == static_cast<ssize_t>(bytes.size());
@@ -68,22 +62,23 @@ class LoopbackServer {
 
   private:
     void serve() const {
-        for (int client = 0; (client = ::accept(m_socket, nullptr, nullptr)) >= 0; ::close(client)) {
+        for (int number = 0; (number = ::accept(m_socket.number(), nullptr, nullptr)) >= 0;) {
+            const os::Descriptor client(number);  // closed with its answer
             std::string request;
             std::array<char, 4096> bytes{};
             while (request.find("</CIM>") == std::string::npos) {
-                const ssize_t length = ::recv(client, bytes.data(), bytes.size(), 0);
+                const ssize_t length = ::recv(number, bytes.data(), bytes.size(), 0);
                 if (length <= 0) break;
                 request.append(bytes.data(), static_cast<std::size_t>(length));
             }
-            m_answer(client, request);
+            m_answer(client.number(), request);
         }
     }
 
     const Answer m_answer;
-    const int m_socket;
+    const os::Descriptor m_socket;
     int m_port = 0;
-    std::thread m_thread;
+    std::jthread m_thread;
 };
 
 TEST(ServerUrlTest, CompletesWhatIsLeftOut) {

@@ -12,6 +12,7 @@
 #include <atomic>
 #include <cerrno>
 #include <ctime>
+#include <filesystem>
 #include <thread>
 
 #include "Host/Authentication/ClientAddress.h"
@@ -52,9 +53,7 @@ TEST(UsersFileTest, ChecksPasswords) {
     const std::string file = folder / "users";
     host::writeUsersFile(
         file, {{"admin", {host::hashPassword(odd), true}}, {"guest", {host::hashPassword("guest"), false}}});
-    struct stat status {};
-    ASSERT_EQ(::stat(file.c_str(), &status), 0);
-    EXPECT_EQ(status.st_mode & 0777U, 0600U);
+    EXPECT_EQ(std::filesystem::status(file).permissions(), std::filesystem::perms(0600));
     host::UsersFile users(file);
     const auto admin = users.check({"admin", odd}, "");
     ASSERT_TRUE(admin);

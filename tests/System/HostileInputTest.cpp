@@ -205,11 +205,10 @@ TEST_F(HostileInputTest, BoundsTheMemoryOfAnswersThatNobodyReads) {
         readers.emplace_back(m_daemon.httpPort(), kBadAddress, 4096);
         readers.back().send(m_largeRequest);
     }
-    for (const RawConnection& reader : readers)
-        EXPECT_TRUE(reader.isAnswered());
+    // Each gets its answer before any has read to the end.
     std::map<int, int> answers;
     for (const RawConnection& reader : readers)
-        ++answers[statusOf(reader.receive())];
+        ++answers[statusOf(reader.receivePiece())];
     EXPECT_GT(answers[200], 0);
     EXPECT_GT(answers[503], 0);
     EXPECT_EQ(answers[200] + answers[503], 60);

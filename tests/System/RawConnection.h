@@ -58,11 +58,6 @@ class RawConnection {
     }
     /// No more will be sent.
     void endSending() const { ::shutdown(m_socket, SHUT_WR); }
-    /// Waits for the first byte of an answer, and leaves it to be read.
-    bool isAnswered() const {
-        char first = 0;
-        return ::recv(m_socket, &first, 1, MSG_PEEK) == 1;
-    }
     /// A piece of what comes; empty once the other side has closed. Expects one of them within a minute,
     /// which is longer than a busy machine takes.
     std::string receivePiece() const {
