@@ -293,4 +293,28 @@ TEST_F(AuthenticationTest, AnswersEveryFailureAfterTheSameTime) {
     EXPECT_EQ(queue.answerAfter(10s), 800ms);
 }
 
+TEST(LoginQueueTest, LetsGoThoseWhoWaitedForChecksThatFailed) {
+    using Turn = host::LoginQueue::Turn;
+    host::LoginQueue queue({.firstDelay = 10ms, .patience = 20s});
+    const host::LoginQueue::Attempt attempt{"admin", "192.0.2.1"};
+    std::optional<Turn> one(std::in_place, queue, attempt, std::stop_token());
+    std::optional<Turn> other(std::in_place, queue, attempt, std::stop_token());
+    std::atomic<int> turns{0};
+    std::vector<std::jthread> waiting;
+    for (int i = 0; i < 4; ++i) {
+        waiting.emplace_back([&](const std::stop_token& stop) {
+            if (const Turn turn(queue, attempt, stop); turn) ++turns;
+        });
+    }
+    std::this_thread::sleep_for(100ms);
+    // From now on the place has to wait, and nobody comes who would look after it.
+    for (std::optional<Turn>* each : {&one, &other}) {
+        (*each)->failed();
+        each->reset();
+    }
+    for (std::jthread& each : waiting)
+        each.join();
+    EXPECT_EQ(turns, 4);
+}
+
 }  // namespace

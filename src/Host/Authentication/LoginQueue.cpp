@@ -52,9 +52,20 @@ void LoginQueue::callNext() {
     }
 }
 
+/// A failure delays those who could have gone, and only waited for others to be done. Nobody may come any
+/// more, so one of them has to see to it that they go.
+void LoginQueue::chooseTimekeeper() {
+    const auto first = std::min_element(m_waiting.begin(), m_waiting.end(), [&](auto left, auto right) {
+        return readyAt(left->attempt) < readyAt(right->attempt);
+    });
+    if (first == m_waiting.end()) return;
+    (*first)->keepsTime = true;
+    (*first)->called.notify_one();
+}
+
 bool LoginQueue::enter(const Attempt& attempt, const std::stop_token& stop) {
     std::unique_lock lock(m_mutex);
-    Waiter me{attempt, false, {}};
+    Waiter me{attempt, false, false, {}};
     m_waiting.push_back(&me);
     callNext();
     const auto givesUp = Clock::now() + m_pace.patience;
@@ -62,10 +73,12 @@ bool LoginQueue::enter(const Attempt& attempt, const std::stop_token& stop) {
         // One that may go and is not called waits for others, who call it when they are done.
         const auto ready = readyAt(attempt);
         const auto until = ready > Clock::now() ? std::min(ready, givesUp) : givesUp;
-        me.called.wait_until(lock, stop, until, [&] { return me.isCalled; });
+        me.called.wait_until(lock, stop, until, [&] { return me.isCalled || me.keepsTime; });
+        me.keepsTime = false;
         callNext();
     }
     if (!me.isCalled) std::erase(m_waiting, &me);
+    chooseTimekeeper();
     return me.isCalled;
 }
 
@@ -73,6 +86,7 @@ void LoginQueue::leave() {
     const std::lock_guard lock(m_mutex);
     --m_running;
     callNext();
+    chooseTimekeeper();
 }
 
 void LoginQueue::succeeded(const Attempt& attempt) {

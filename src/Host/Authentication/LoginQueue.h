@@ -100,6 +100,7 @@ class LoginQueue {
     struct Waiter {
         const Attempt& attempt;
         bool isCalled = false;
+        bool keepsTime = false;  ///< has to look again when it may go, and to call whoever goes then
         std::condition_variable_any called;
     };
 
@@ -110,6 +111,7 @@ class LoginQueue {
     Clock::time_point readyAt(const Attempt& attempt) const;
     std::vector<Waiter*>::iterator next(Clock::time_point now);
     void callNext();
+    void chooseTimekeeper();
 
     const LoginPace m_pace;
     std::mutex m_mutex;
