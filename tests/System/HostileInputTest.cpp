@@ -129,6 +129,25 @@ TEST_F(HostileInputTest, DropsSilentConnectionsForNewOnes) {
     EXPECT_EQ(silent.front().receive(), "");
 }
 
+TEST_F(HostileInputTest, AnswersWhomTheDelaysOfOthersHadWaitForLong) {
+    std::list<RawConnection> guessers;
+    for (int i = 0; i < 8; ++i) {
+        guessers.emplace_back(m_daemon.httpPort(), kBadAddress);
+        guessers.back().send(httpRequest(m_body, "Authorization: Basic Z3Vlc3Q6eA=="));
+    }
+    std::this_thread::sleep_for(200ms);
+    // Longer than a connection may be idle. The body comes by itself, as it does with TLS.
+    const std::string request = httpRequest(m_body, "Authorization: Basic Z3Vlc3Q6Z3Vlc3Q=");
+    const std::size_t head = request.size() - m_body.size();
+    const RawConnection connection(m_daemon.httpPort(), kBadAddress);
+    connection.send(request.substr(0, head));
+    std::this_thread::sleep_for(200ms);
+    connection.send(request.substr(head));
+    EXPECT_EQ(statusOf(connection.receive()), 200);
+    for (const RawConnection& guesser : guessers)
+        EXPECT_EQ(statusOf(guesser.receive()), 401);
+}
+
 TEST_F(HostileInputTest, RefusesWhatIsTooLarge) {
     std::string announced = httpRequest("");
     announced.replace(announced.find("Length: 0"), 9, "Length: 1073741824");

@@ -130,11 +130,18 @@ std::optional<HttpAnswer> HttpRequest::authenticate() {
     return std::nullopt;
 }
 
+void HttpRequest::goOn() {
+    m_server.m_watch->allow(m_socket, m_server.m_limits.requestTime);
+    // The library has gone on counting how long nothing moved. It counts anew from where there was no limit.
+    for (const unsigned int seconds : {0U, static_cast<unsigned int>(m_server.m_limits.idleTime.count())})
+        ::MHD_set_connection_option(m_connection, MHD_CONNECTION_OPTION_TIMEOUT, seconds);
+}
+
 MHD_Result HttpRequest::begin() {
     // If a client may not send its body, it is told before it sends a megabyte.
     m_refusal = checkHead(m_head, m_server.m_limits.bodyBytes);
     if (!m_refusal) m_refusal = authenticate();
-    m_server.m_watch->allow(m_socket, m_server.m_limits.requestTime);
+    goOn();
     if (!m_refusal) {
         // If a client announces a large body and sends none, only this much memory is wasted.
         m_body.reserve(std::min<std::size_t>(*contentLengthOf(m_head), std::size_t{1} << 16));
@@ -200,7 +207,7 @@ MHD_Result HttpRequest::queue(HttpAnswer answer) {
         ::MHD_add_response_header(response, name.c_str(), value.c_str());
     }
     if (m_mustDrain || m_server.m_stopping.load()) ::MHD_add_response_header(response, "Connection", "close");
-    m_server.m_watch->allow(m_socket, m_server.m_limits.requestTime);
+    goOn();
     const MHD_Result result = ::MHD_queue_response(m_connection, status, response);
     ::MHD_destroy_response(response);
     return result;

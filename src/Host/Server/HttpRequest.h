@@ -79,6 +79,8 @@ class HttpRequest {
     bool isLocal() const;
     std::optional<HttpAnswer> authenticate();
     HttpAnswer carryOut();
+    /// The client's time runs again, after it has had to wait for us.
+    void goOn();
     MHD_Result queue(HttpAnswer answer);
     bool isBodySmall() const;
 
