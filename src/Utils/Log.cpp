@@ -121,7 +121,8 @@ void openLinuxLog() noexcept {
     std::lock_guard<std::mutex> lock(openMutex);
     if (logLevel.load() != -1) return;
     const std::int32_t level = levelFromEnvironment();
-    openlog("quenx", openOptions(), LOG_USER);
+    // The system keeps the pointer, and the host may log when this library has gone.
+    openlog(::strdup("quenx"), openOptions(), LOG_USER);
     syslog(LOG_NOTICE, "Opening log, level=%d", level);
     syslog(LOG_NOTICE, "%s", kBanner);
     logLevel.store(level);

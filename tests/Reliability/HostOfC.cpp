@@ -14,6 +14,7 @@
 #include <stdlib.h>
 #include <string.h>
 #include <sys/wait.h>
+#include <syslog.h>
 #include <unistd.h>
 
 namespace {
@@ -100,6 +101,8 @@ int main(int argc, char** argv) {
 
     // The rest goes with its last user.
     dlclose(starter);
+    // A host goes on logging; the system has kept what it was told at the opening of the log.
+    syslog(LOG_DEBUG, "unloaded");
     printf("any: %d\n", isMapped("libQuenx_CimFramework.so") + isMapped("libQuenx_Utils.so"));
     return 0;
 }
