@@ -28,8 +28,20 @@ void CimClass::disableIndications() {}
 
 CimClass::~CimClass() = default;
 
-CimClasses::~CimClasses() {
-    clear();
+namespace {
+
+/// One by one from the end: a vector's destructor promises no order, and later class objects may use earlier
+/// ones.
+void destroyFromTheEnd(std::vector<std::unique_ptr<ServedClass>>& served) {
+    while (!served.empty())
+        served.pop_back();
+}
+
+}  // namespace
+
+CimClasses::~CimClasses() QUENX_NO_THREAD_SAFETY_ANALYSIS {
+    // Without the lock, which nobody can want any more, and which a child may have got locked.
+    destroyFromTheEnd(m_served);
 }
 
 void CimClasses::append(ServedClass served) {
@@ -82,10 +94,7 @@ void CimClasses::clear() {
         const utils::Mutex::AutoLocker lock(m_mutex);
         released.swap(m_served);
     }
-    // One by one from the end: a vector's destructor promises no order, and later class objects may use
-    // earlier ones.
-    while (!released.empty())
-        released.pop_back();
+    destroyFromTheEnd(released);
 }
 
 }  // namespace core
