@@ -1,5 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 // What else a host and its machine may do to an update.
+#include <thread>
+
 #include "Framework/Classes/InstanceList.h"
 #include "Providers/SoftwareUpdate/UpdateTest.h"
 #include "Reliability/Interposed.h"
@@ -55,6 +57,23 @@ TEST_F(OddHostTest, RefusesThreadsToJobsThatAreThenWaitedForTogether) {
     // Three seconds, and not fifteen.
     EXPECT_LT(std::chrono::steady_clock::now() - begin, std::chrono::seconds(12));
     EXPECT_EQ(m_log.count("waiting for terminate"), 5U);
+    expectUpdateWorks();
+}
+
+TEST_F(OddHostTest, CancelsAThreadThatIsInACall) {
+    const std::string image = goodImage();
+    m_backend->hold("prepareFlashImage");
+    std::thread caller([&] {
+        install(image, "eth0");
+        pthread_testcancel();
+        ADD_FAILURE() << "goes on although it was cancelled";
+    });
+    m_backend->waitUntilHeld();
+    ASSERT_EQ(pthread_cancel(caller.native_handle()), 0);
+    m_backend->letGo();
+    caller.join();
+    EXPECT_EQ(m_requests.enumerateInstanceNames("Quenx_ConcreteJob").size(), 1U);
+    deleteJobs();
     expectUpdateWorks();
 }
 

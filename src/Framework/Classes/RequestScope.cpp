@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Framework/Classes/RequestScope.h"
 
+#include <pthread.h>
+
 #include <utility>
 
 namespace core {
@@ -23,7 +25,10 @@ AgentUse::~AgentUse() {
 }
 
 RequestScope::RequestScope() : m_outermost(currentScope == nullptr) {
-    if (m_outermost) currentScope = this;
+    if (!m_outermost) return;
+    currentScope = this;
+    // Cancelled in here, a host's thread would leave locks behind, and end the process at the first noexcept.
+    ::pthread_setcancelstate(PTHREAD_CANCEL_DISABLE, &m_cancelState);
 }
 
 RequestScope::~RequestScope() {
@@ -32,6 +37,7 @@ RequestScope::~RequestScope() {
     // Instances go before their agents may.
     m_held.clear();
     m_agents.clear();
+    ::pthread_setcancelstate(m_cancelState, nullptr);
 }
 
 RequestScope* RequestScope::current() {

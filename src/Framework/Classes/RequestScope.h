@@ -56,6 +56,7 @@ class QUENX_EXPORT RequestScope {
 
   private:
     bool m_outermost;
+    int m_cancelState = 0;
     std::vector<std::shared_ptr<const void>> m_held;
     std::vector<AgentUse> m_agents;
 };
