@@ -8,7 +8,6 @@
 
 #include <cerrno>
 #include <cstdio>
-#include <cstdlib>
 #include <sstream>
 #include <system_error>
 
@@ -33,6 +32,7 @@ void requireOwnFile(int file, const std::string& path) {
     if (::fstat(file, &status) != 0) fail(path, errno);
     if (!S_ISREG(status.st_mode)) fail(path, EINVAL);
     if (status.st_nlink > 1) fail(path, EMLINK);
+    if (status.st_uid != ::geteuid()) fail(path, EACCES);
     const bool isOpenToOthers = (status.st_mode & (S_IRWXG | S_IRWXO)) != 0;
     if (isOpenToOthers && status.st_uid == ::geteuid() && ::fchmod(file, kOwnerOnly) != 0) fail(path, errno);
 }
@@ -71,8 +71,8 @@ std::string programOf(pid_t process) {
 }  // namespace
 
 FileLock::FileLock(const std::string& path, std::chrono::milliseconds patience)
-    : m_file(::open(path.c_str(), O_RDWR | O_CREAT | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY,
-                    kOwnerOnly)) {
+    : m_file(aboveStandard(::open(
+          path.c_str(), O_RDWR | O_CREAT | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY, kOwnerOnly))) {
     if (m_file.number() < 0) fail(path, errno);
     requireOwnFile(m_file.number(), path);
     const int error = lockWithin(m_file.number(), patience);
@@ -82,12 +82,16 @@ FileLock::FileLock(const std::string& path, std::chrono::milliseconds patience)
 }
 
 FileLock::~FileLock() {
+    if (!m_held || m_process != ::getpid()) return;
     // Emptied before it is free again, so that nobody reads the id of a process that is done.
-    if (m_held && ::ftruncate(m_file.number(), 0) != 0) errno = 0;
+    if (::ftruncate(m_file.number(), 0) != 0) errno = 0;
+    // Closing frees it only when no child that was forked meanwhile has the file open.
+    ::flock(m_file.number(), LOCK_UN);
 }
 
 std::string FileLock::holder() const {
     const pid_t process = holdingProcess();
+    // One that the kernel does not list runs in another container, where it has another number.
     if (process <= 0) return "another process";
     if (process == ::getpid()) return "this process (" + std::to_string(process) + ")";
     return "process " + std::to_string(process) + programOf(process);
@@ -113,10 +117,7 @@ pid_t FileLock::holdingProcess() const {
         if (makedev(major, minor) == status.st_dev) return process;
         sameInode = process;
     }
-    if (sameInode > 0) return sameInode;
-    char text[16] = {};
-    if (::pread(m_file.number(), text, sizeof text - 1, 0) <= 0) return 0;
-    return static_cast<pid_t>(std::strtol(text, nullptr, 10));
+    return sameInode;
 }
 
 void FileLock::leaveProcessId() const {

@@ -38,6 +38,7 @@ class QUENX_EXPORT FileLock {
 
     const Descriptor m_file;
     bool m_held = false;
+    const pid_t m_process = ::getpid();  ///< a child that was forked meanwhile holds nothing
 };
 
 }  // namespace os

@@ -136,6 +136,15 @@ std::optional<std::vector<std::uint8_t>> readWholeFile(const std::string& path, 
     return bytes;
 }
 
+int aboveStandard(int descriptor) noexcept {
+    if (descriptor < 0 || descriptor > STDERR_FILENO) return descriptor;
+    const int copy = fcntl(descriptor, F_DUPFD_CLOEXEC, STDERR_FILENO + 1);
+    const int error = errno;
+    close(descriptor);
+    errno = error;
+    return copy;
+}
+
 bool isThisADir(const std::string& path) noexcept {
     return Directory(opendir(path.c_str())) != nullptr;
 }

@@ -56,6 +56,10 @@ QUENX_EXPORT std::size_t readFile(const std::string& path, std::span<std::uint8_
 QUENX_EXPORT std::optional<std::vector<std::uint8_t>> readWholeFile(const std::string& path,
                                                                     std::size_t most);
 
+/// The descriptor or, in its place, a copy with a number above 2: what others write to streams that their
+/// process has closed must not reach the file. -1 with errno set when there is none; never throws.
+QUENX_EXPORT int aboveStandard(int descriptor) noexcept;
+
 /// True exactly when the path can be opened as a directory.
 QUENX_EXPORT bool isThisADir(const std::string& path) noexcept;
 

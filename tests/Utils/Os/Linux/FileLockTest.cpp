@@ -45,7 +45,20 @@ TEST(FileLockTest, TellsWhoHoldsIt) {
     EXPECT_TRUE(refused.holder().starts_with("process " + std::to_string(child) + " (")) << refused.holder();
     ::kill(child, SIGKILL);
     ::waitpid(child, nullptr, 0);
-    EXPECT_TRUE(os::FileLock(other, std::chrono::seconds(30)).isHeld());
+    // Nor does a child keep what its parent held, and lets go of.
+    auto let = std::make_unique<os::FileLock>(other, std::chrono::seconds(30));
+    EXPECT_TRUE(let->isHeld());
+    const pid_t heir = ::fork();
+    if (heir == 0) {
+        let.reset();
+        for (;;)
+            ::pause();
+    }
+    EXPECT_FALSE(os::FileLock(other).isHeld());
+    let.reset();
+    EXPECT_TRUE(os::FileLock(other).isHeld());
+    ::kill(heir, SIGKILL);
+    ::waitpid(heir, nullptr, 0);
 }
 
 TEST(FileLockTest, TakesOnlyAFileThatIsItsUsersOwn) {
@@ -55,7 +68,9 @@ TEST(FileLockTest, TakesOnlyAFileThatIsItsUsersOwn) {
     std::filesystem::create_symlink(folder / "new", folder / "dangling");
     std::filesystem::create_hard_link(precious, folder / "second-name");
     ASSERT_EQ(::mkfifo((folder / "fifo").c_str(), 0600), 0);
-    for (const char* name : {"link", "dangling", "second-name", "fifo", "."})
+    folder.write("foreign", "");
+    const bool isRoot = ::chown((folder / "foreign").c_str(), 1, 1) == 0;
+    for (const char* name : {"link", "dangling", "second-name", "fifo", ".", isRoot ? "foreign" : "."})
         EXPECT_THROW(os::FileLock(folder / name), std::system_error) << name;
     EXPECT_EQ(test::readTestFile(precious).size(), 7U);
     EXPECT_FALSE(std::filesystem::exists(folder / "new"));

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Utils/Os/Linux/linux.h"
 
+#include <fcntl.h>
 #include <grp.h>
 #include <gtest/gtest.h>
 #include <sys/stat.h>
@@ -74,7 +75,11 @@ TEST(LinuxTest, KeepsTheNumbersOfClosedStandardStreams) {
                 close(number);
             os::openStandardDescriptors();
             const int next = dup(0);
-            _exit(next > 2 && write(1, "x", 1) == 1 && write(2, "x", 1) == 1 ? 0 : 1);
+            close(2);
+            const int above = os::aboveStandard(dup(0));
+            const bool isFree = fcntl(2, F_GETFD) < 0 && dup(0) == 2;
+            _exit(isFree && above > next && next > 2 && write(1, "x", 1) == 1 && write(2, "x", 1) == 1 ? 0
+                                                                                                       : 1);
         },
         testing::ExitedWithCode(0), "");
 }
