@@ -100,6 +100,36 @@ TEST_F(FlashStoreTest, MendsARecordMadeFromTheBanksAtTheNextChange) {
     EXPECT_TRUE(found == "IMG_PXE 5, IMG_UEFI 0" || found == "IMG_PXE 6, IMG_UEFI 0") << found;
 }
 
+TEST_F(FlashStoreTest, DoesNotTrustAnOldRecordThatFitsNoBank) {
+    writeRevision(2);
+    const Bytes old = test::readTestFile(path("state"));
+    for (std::uint16_t revision = 3; revision < 6; ++revision)
+        writeRevision(revision);
+    write("state", old);
+    test::SyslogCapture::clear();
+    EXPECT_EQ(afterRestart(), "IMG_PXE 5, IMG_UEFI 0");
+    EXPECT_EQ(test::SyslogCapture::count(path("state") + " fits neither bank; its copy is used"), 1U);
+    writeRevision(6);
+    EXPECT_EQ(afterRestart(), "IMG_PXE 6, IMG_UEFI 0");
+}
+
+TEST_F(FlashStoreTest, WritesToNoFileButItsOwn) {
+    writeRevision(2);
+    const std::string precious = m_adapters.folder().write("precious", "content");
+    const std::string other =
+        path(m_adapters->flashState("eth0").activeBank == 0 ? "bank-1.rom" : "bank-0.rom");
+    const auto write = [] { return test::writeImage("eth0", test::madeRom({{PXE, 3}})).done; };
+    fs::remove(other);
+    fs::create_hard_link(precious, other);
+    EXPECT_FALSE(write());
+    EXPECT_EQ(fs::file_size(precious), 7U);
+    fs::remove(other);
+    ASSERT_EQ(::mkfifo(other.c_str(), 0600), 0);
+    EXPECT_FALSE(write());
+    fs::remove(other);
+    EXPECT_TRUE(write());
+}
+
 TEST_F(FlashStoreTest, ReadsAndKeepsTheLayoutOfRecordedFiles) {
     const Bytes recorded = test::readTestFile(QUENX_MIDAPI_TEST_DIR "/samples/record-1");
     const Bytes changed = test::readTestFile(QUENX_MIDAPI_TEST_DIR "/samples/record-1-changed");

@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "MidAPI/Simulator/FlashFolder.h"
 
+#include <algorithm>
+#include <array>
 #include <cerrno>
 #include <filesystem>
 #include <span>
@@ -24,7 +26,8 @@ std::optional<Bytes> contentOf(const std::string& path, std::size_t most) try {
 } catch (const std::system_error& error) {
     // A worn-out medium, or a folder in the file's place, is damage like any other. A file that this user
     // may not read is none.
-    if (error.code().value() != EIO && error.code().value() != EISDIR) throw;
+    constexpr std::array kDamage = {EIO, EISDIR, EUCLEAN, EBADMSG, ENODATA, ELOOP};
+    if (std::ranges::find(kDamage, error.code().value()) == kDamage.end()) throw;
     return Bytes();
 }
 
@@ -33,18 +36,24 @@ std::optional<Bytes> contentOf(const std::string& path, std::size_t most) try {
 FoundState FlashFolder::findState(const FlashState& factory) const {
     const auto recorded = contentOf(record(), kFlashStateLength + 1);
     if (auto state = recorded ? decodeFlashState(*recorded) : std::nullopt) return {state, ""};
+    // A first change that was cut off, or is under way, leaves the factory's content in one bank.
+    if (!recorded && !std::filesystem::exists(copy()) && !std::filesystem::exists(bank(1))) return {};
+    FoundState found = findWithoutRecord(factory, recorded ? "is damaged" : "is missing");
+    if (found.state) return found;
+    throw std::runtime_error(found.damage + ", and no bank in " + m_path +
+                             " is intact; remove the folder to have the adapter as it left the factory");
+}
+
+FoundState FlashFolder::findWithoutRecord(const FlashState& factory, const std::string& why) const {
     const auto copied = contentOf(copy(), kFlashStateLength + 1);
-    const std::string damage = "the record " + record() + (recorded ? " is damaged" : " is missing");
+    const std::string damage = "the record " + record() + " " + why;
     // A copy that fits neither bank is older than both: a version that keeps none has written since.
     if (auto state = copied ? decodeFlashState(*copied) : std::nullopt; state && isBootable(*state))
         return {state, damage + "; its copy is used"};
-    // A first change that was cut off, or is under way, leaves the factory's content in one bank.
-    if (!recorded && !copied && !std::filesystem::exists(bank(1))) return {};
     if (auto state = rebuild(factory))
         return {state, damage + ", its copy is no better; it is made anew from the banks, and boots " +
                            bank(state->activeBank)};
-    throw std::runtime_error(damage + ", and no bank in " + m_path +
-                             " is intact; remove the folder to have the adapter as it left the factory");
+    return {std::nullopt, damage};
 }
 
 std::optional<Bytes> FlashFolder::bankContent(const FlashState& state, std::uint8_t number) const {

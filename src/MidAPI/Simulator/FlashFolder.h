@@ -33,12 +33,16 @@ class FlashFolder {
     /// @param factory  for what no bank tells
     /// @throws std::runtime_error when there is damage and nothing whole is left
     FoundState findState(const FlashState& factory) const;
+    /// The same where the record is of no use; no state when nothing whole is left.
+    /// @param why  for the text: "is damaged"
+    FoundState findWithoutRecord(const FlashState& factory, const std::string& why) const;
+    /// Whether a bank holds what the record says.
+    bool isBootable(const FlashState& state) const;
 
     /// The content of a bank, when it is what the record says.
     std::optional<std::vector<std::uint8_t>> bankContent(const FlashState& state, std::uint8_t number) const;
 
   private:
-    bool isBootable(const FlashState& state) const;
     std::optional<FlashState> rebuild(const FlashState& factory) const;
 
     const std::string m_path;

@@ -21,6 +21,7 @@ struct FlashBank {
     std::uint32_t checksum = 0;
 
     bool holds(std::span<const std::uint8_t> content) const;
+    bool operator==(const FlashBank&) const = default;
 };
 
 /// What an adapter remembers beside the content of its two banks. docs/image-format.md has its bytes.
@@ -33,6 +34,7 @@ struct FlashState {
 
     const FlashBank& active() const { return banks[activeBank]; }
     std::uint8_t inactiveBank() const { return static_cast<std::uint8_t>(1 - activeBank); }
+    bool operator==(const FlashState&) const = default;
 };
 
 /// The bit of a type in the capability word; 0 for a type that has none.

@@ -16,6 +16,8 @@
 namespace ma {
 namespace {
 
+// As the record of an old backup does.
+constexpr const char* kFitsNoBank = "fits neither bank";
 constexpr std::size_t kChunk = 4096;  // a sector of the flash
 
 /// An open file of FlashFiles, closed with the scope.
@@ -53,8 +55,13 @@ bool closeToOthers(const std::string& path) {
     struct stat status {};
     if (folder.number() < 0 || ::fstat(folder.number(), &status) != 0)
         throw std::system_error(errno, std::generic_category(), "cannot use the folder " + path);
+    if (status.st_uid != ::geteuid()) {
+        throw std::system_error(EACCES, std::generic_category(),
+                                "the folder " + path + " belongs to user " + std::to_string(status.st_uid) +
+                                    ", who could exchange the flash; choose another one, or make it yours");
+    }
     const bool isOpen = (status.st_mode & (S_IRWXG | S_IRWXO)) != 0;
-    if (isOpen && status.st_uid == ::geteuid() && ::fchmod(folder.number(), S_IRWXU) != 0)
+    if (isOpen && ::fchmod(folder.number(), S_IRWXU) != 0)
         throw std::system_error(errno, std::generic_category(), "cannot protect the folder " + path);
     return true;
 }
@@ -69,7 +76,10 @@ FlashStore::FlashStore(std::string folder, std::vector<std::uint8_t> factoryFlas
       m_files(std::move(files)) {}
 
 FoundState FlashStore::findState() const {
-    FoundState found = m_folder.findState(m_factoryState);
+    return logOnce(m_folder.findState(m_factoryState));
+}
+
+FoundState FlashStore::logOnce(FoundState found) const {
     // Once, not at every query: the next change mends it.
     const utils::Mutex::AutoLocker lock(m_damageMutex);
     if (found.damage != m_damage && !found.damage.empty()) QUENX_ERROR_TEXT(found.damage);
@@ -86,9 +96,15 @@ std::vector<std::uint8_t> FlashStore::content() const {
         if (auto bytes = m_folder.bankContent(*state, state->activeBank)) return *bytes;
         // Another process may have made two updates since the record was read.
         if (this->state().generation != state->generation) continue;
-        QUENX_ERROR("%s is damaged, booting the other bank", m_folder.bank(state->activeBank).c_str());
-        if (auto bytes = m_folder.bankContent(*state, state->inactiveBank())) return *bytes;
+        if (auto bytes = m_folder.bankContent(*state, state->inactiveBank())) {
+            QUENX_ERROR("%s is damaged, booting the other bank", m_folder.bank(state->activeBank).c_str());
+            return *bytes;
+        }
         break;
+    }
+    if (const FoundState found = m_folder.findWithoutRecord(m_factoryState, kFitsNoBank); found.state) {
+        logOnce(found);
+        if (auto bytes = m_folder.bankContent(*found.state, bootedBank(*found.state))) return *bytes;
     }
     throw std::runtime_error("no bank in " + m_folder.path() +
                              " is intact; remove the folder to have the adapter as it left the factory");
@@ -105,8 +121,14 @@ void FlashStore::write(std::span<const std::uint8_t> image, const std::function<
     // cut here.
     const auto bank = static_cast<std::uint8_t>(1 - bootedBank(before));
     writeBank(bank, image, reached);
+    FlashState written = before;
+    written.banks[bank] = {static_cast<std::uint32_t>(image.size()), crc32(image)};
+    // Read back: what is not there must not become what boots.
+    if (!m_folder.bankContent(written, bank))
+        throw std::runtime_error(m_folder.bank(bank) +
+                                 " does not hold what was written; the old flash stays");
     changeState([&](FlashState& state) {
-        state.banks[bank] = {static_cast<std::uint32_t>(image.size()), crc32(image)};
+        state.banks[bank] = written.banks[bank];
         state.activeBank = bank;
     });
 }
@@ -126,7 +148,12 @@ FlashState FlashStore::initialise() {
     makeFolders();
     const RecordLock lock(m_folder.file("state.lock"), m_files->patience());
     // Another process may have made the files while we waited for the lock.
-    if (const FoundState found = findState(); found.state) {
+    FoundState found = findState();
+    if (found.state && !m_folder.isBootable(*found.state)) {
+        if (FoundState rescued = m_folder.findWithoutRecord(m_factoryState, kFitsNoBank); rescued.state)
+            found = logOnce(std::move(rescued));
+    }
+    if (found.state) {
         // Mended before a bank is written to, which may be what it was found by.
         if (!found.damage.empty()) storeState(*found.state);
         return *found.state;

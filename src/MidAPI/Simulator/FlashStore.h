@@ -52,6 +52,7 @@ class FlashStore {
   private:
     void makeFolders();
     FoundState findState() const;
+    FoundState logOnce(FoundState found) const;
     FlashState initialise();
     void writeBank(std::uint8_t bank, std::span<const std::uint8_t> image,
                    const std::function<void(std::size_t)>& reached);

@@ -153,17 +153,18 @@ utils::PCIAddr SimulatedAdapter::address() {
 }
 
 std::vector<utils::FirmwareVersionInfo> SimulatedAdapter::components() {
-    const std::uint32_t generation = m_store.state().generation;
+    // Not by its number alone: somebody may have removed the folder, and begun to count anew.
+    const FlashState state = m_store.state();
     {
         const utils::Mutex::AutoLocker lock(m_cacheMutex);
-        if (m_cache && m_cache->generation == generation) return m_cache->components;
+        if (m_cache && m_cache->state == state) return m_cache->components;
     }
     const std::vector<std::uint8_t> flash = m_store.content();
     std::vector<utils::FirmwareVersionInfo> found;
     if (!flash.empty()) found = parseOptionRom(flash).components();
     const utils::Mutex::AutoLocker lock(m_cacheMutex);
-    // The content may be newer than the number; then the next query reads once more.
-    m_cache = Cache{generation, found};
+    // The content may be newer than the state; then the next query reads once more.
+    m_cache = Cache{state, found};
     return found;
 }
 

@@ -92,7 +92,7 @@ class SimulatedAdapter {
 
     /// What the flash held when it was last read, so that a query need not read it again.
     struct Cache {
-        std::uint32_t generation;
+        FlashState state;
         std::vector<utils::FirmwareVersionInfo> components;
     };
     utils::Mutex m_cacheMutex;
