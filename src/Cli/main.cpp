@@ -31,9 +31,11 @@ void noteInterruptions() {
     action.sa_flags = SA_RESTART;  // a read or write under way is not what the user wants to stop
     for (const int signal : {SIGINT, SIGTERM, SIGHUP})
         sigaction(signal, &action, nullptr);
-    // If the reader of a pipe has gone, writing fails, and the update goes on.
+    // If the reader of a pipe has gone, or a file may not grow, writing fails, and the update goes on; so it
+    // does after a signal that means nothing here.
     action.sa_handler = SIG_IGN;
-    sigaction(SIGPIPE, &action, nullptr);
+    for (const int signal : {SIGPIPE, SIGXFSZ, SIGUSR1, SIGUSR2, SIGALRM, SIGVTALRM, SIGPROF, SIGIO, SIGPWR})
+        sigaction(signal, &action, nullptr);
 }
 
 std::string adviceFor(const core::CimError& error) {

@@ -22,7 +22,8 @@ class Signals {
         ::pthread_sigmask(SIG_BLOCK, &m_set, nullptr);
         // A client that goes away while it is answered must not end the daemon, nor a signal that means
         // nothing here, in the middle of a flash.
-        for (const int signal : {SIGPIPE, SIGUSR1, SIGUSR2, SIGALRM, SIGVTALRM, SIGPROF, SIGIO, SIGPWR})
+        for (const int signal :
+             {SIGPIPE, SIGXFSZ, SIGUSR1, SIGUSR2, SIGALRM, SIGVTALRM, SIGPROF, SIGIO, SIGPWR})
             (void)std::signal(signal, SIG_IGN);
     }
 
