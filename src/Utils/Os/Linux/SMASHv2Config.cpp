@@ -162,7 +162,7 @@ void SMASHv2Config::takeSetting(const std::string& key, std::istream& words, Str
 }
 
 SMASHv2Config::OwnSettings SMASHv2Config::readOwnSettings() {
-    Mutex::AutoLocker locker(m_mutex);
+    Mutex::AutoLocker locker(m_ownMutex);
     try {
         readSettings(m_path,
                      [&](const std::string& key, std::istream& words) QUENX_NO_THREAD_SAFETY_ANALYSIS {

@@ -76,7 +76,7 @@ class QUENX_EXPORT SMASHv2Config : public AutoSingleton<SMASHv2Config> {
     void takeSetting(const std::string& key, std::istream& words, StringArray& directories)
         QUENX_REQUIRES(m_mutex);
     OwnSettings readOwnSettings();
-    void takeOwnSetting(const std::string& key, const std::string& word) QUENX_REQUIRES(m_mutex);
+    void takeOwnSetting(const std::string& key, const std::string& word) QUENX_REQUIRES(m_ownMutex);
 
     Mutex m_mutex;
     std::uint16_t m_oemCustomization QUENX_GUARDED_BY(m_mutex) = 0;
@@ -85,7 +85,8 @@ class QUENX_EXPORT SMASHv2Config : public AutoSingleton<SMASHv2Config> {
     std::uint32_t m_lockerTimeout QUENX_GUARDED_BY(m_mutex) = 300000;
     bool m_downgradeBlocked QUENX_GUARDED_BY(m_mutex) = false;
     StringArray m_firmwarePaths QUENX_GUARDED_BY(m_mutex);
-    OwnSettings m_own QUENX_GUARDED_BY(m_mutex);
+    Mutex m_ownMutex;
+    OwnSettings m_own QUENX_GUARDED_BY(m_ownMutex);
 };
 
 extern template class Singleton<SMASHv2Config>;
