@@ -69,7 +69,7 @@ struct ObjectName {
 std::string readNamespace(const pugi::xml_node& element);
 
 /// Any of INSTANCENAME, LOCALINSTANCEPATH, INSTANCEPATH, CLASSNAME, LOCALCLASSPATH, CLASSPATH. A single
-/// unnamed key gets the empty name.
+/// unnamed key gets the empty name. Keys may refer to others three levels deep.
 ObjectName readObject(const pugi::xml_node& element, KeyTyping typing);
 
 /// VALUE.REFERENCE.

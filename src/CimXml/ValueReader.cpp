@@ -21,26 +21,48 @@ std::optional<core::CimScalar> typedKey(const pugi::xml_node& element, const std
     return number ? number : core::parseScalar(core::CimType::Real64, text);
 }
 
-core::CimScalar readKeyValue(const pugi::xml_node& element, KeyTyping typing) {
-    if (isElement(element, "VALUE.REFERENCE")) return readReference(element, typing);
+/// How paths are read, and how deep inside the keys of others.
+struct Reading {
+    KeyTyping typing;
+    unsigned depth = 0;
+
+    /// For a key that is a path itself. Each level doubles the quotes and backslashes of those inside when
+    /// the path is written as a text, so a small message could take all memory.
+    Reading inside(const pugi::xml_node& key) const {
+        constexpr unsigned kDeepest = 3;
+        if (depth == kDeepest)
+            refuseElement(key, "lies more than three references deep in the keys of a path");
+        return {typing, depth + 1};
+    }
+};
+
+ObjectName readObjectAt(const pugi::xml_node& element, const Reading& reading);
+
+core::CimPath readReferenceAt(const pugi::xml_node& element, const Reading& reading) {
+    expectElement(element, "VALUE.REFERENCE");
+    return readObjectAt(onlyChild(element), reading).path;
+}
+
+core::CimScalar readKeyValue(const pugi::xml_node& element, const Reading& reading) {
+    if (isElement(element, "VALUE.REFERENCE")) return readReferenceAt(element, reading.inside(element));
     expectElement(element, "KEYVALUE");
     std::string text = textOf(element);
-    if (typing == KeyTyping::ByAttributes) {
+    if (reading.typing == KeyTyping::ByAttributes) {
         if (auto typed = typedKey(element, text)) return std::move(*typed);
     }
     // Also one that is not of its stated type: a foreign server's path has to be sent back as it came.
     return text;
 }
 
-core::CimPath readInstanceName(const pugi::xml_node& element, KeyTyping typing) {
+core::CimPath readInstanceName(const pugi::xml_node& element, const Reading& reading) {
     std::vector<core::CimKey> keys;
     const std::vector<pugi::xml_node> children = childElements(element);
     for (const pugi::xml_node& child : children) {
         if (isElement(child, "KEYBINDING")) {
-            keys.push_back({requiredAttribute(child, "NAME"), readKeyValue(onlyChild(child), typing)});
+            keys.push_back({requiredAttribute(child, "NAME"), readKeyValue(onlyChild(child), reading)});
         } else if (children.size() == 1) {
             // The key of a class with a single one may go without its name (DSP0201 5.2.2.2).
-            keys.push_back({"", readKeyValue(child, typing)});
+            keys.push_back({"", readKeyValue(child, reading)});
         } else {
             refuseElement(child, "stands where KEYBINDING was expected");
         }
@@ -80,6 +102,18 @@ std::optional<core::CimScalar> readText(const pugi::xml_node& element, core::Cim
     return core::parseScalar(type, text);
 }
 
+ObjectName readObjectAt(const pugi::xml_node& element, const Reading& reading) {
+    if (isElement(element, "CLASSNAME")) return {{requiredAttribute(element, "NAME"), {}}, true};
+    if (isElement(element, "INSTANCENAME")) return {readInstanceName(element, reading), false};
+    if (!isFullPath(element)) refuseElement(element, "names no object");
+    const std::vector<pugi::xml_node> parts = childElements(element);
+    // A full path inside a full path would let a message nest without end.
+    if (parts.size() != 2 || isFullPath(parts[1])) refuseElement(element, "must hold a namespace and a name");
+    ObjectName object = readObjectAt(parts[1], reading);
+    readLocation(parts[0], object.path);
+    return object;
+}
+
 }  // namespace
 
 std::string readNamespace(const pugi::xml_node& element) {
@@ -95,20 +129,11 @@ std::string readNamespace(const pugi::xml_node& element) {
 }
 
 ObjectName readObject(const pugi::xml_node& element, KeyTyping typing) {
-    if (isElement(element, "CLASSNAME")) return {{requiredAttribute(element, "NAME"), {}}, true};
-    if (isElement(element, "INSTANCENAME")) return {readInstanceName(element, typing), false};
-    if (!isFullPath(element)) refuseElement(element, "names no object");
-    const std::vector<pugi::xml_node> parts = childElements(element);
-    // A full path inside a full path would let a message nest without end.
-    if (parts.size() != 2 || isFullPath(parts[1])) refuseElement(element, "must hold a namespace and a name");
-    ObjectName object = readObject(parts[1], typing);
-    readLocation(parts[0], object.path);
-    return object;
+    return readObjectAt(element, {typing});
 }
 
 core::CimPath readReference(const pugi::xml_node& element, KeyTyping typing) {
-    expectElement(element, "VALUE.REFERENCE");
-    return readObject(onlyChild(element), typing).path;
+    return readReferenceAt(element, {typing});
 }
 
 std::optional<core::CimType> readType(const pugi::xml_node& element, const char* attribute) {
