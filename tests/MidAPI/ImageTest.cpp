@@ -2,6 +2,7 @@
 #include <gtest/gtest.h>
 
 #include <algorithm>
+#include <cstring>
 #include <numeric>
 
 #include "MidAPI/Image/ImagePreparation.h"
@@ -46,6 +47,22 @@ TEST(OptionRomTest, FindsTheProductNameInAChainOfHeaders) {
     ma::writeLe16(rom, kSecond + ma::rom::kPnpNext, kFirst);  // a ring
     mend(rom);
     EXPECT_EQ("IMG_PXE 1", test::describeRom(rom));
+}
+
+// Else an image could be checked as one type and written as another.
+TEST(OptionRomTest, TellsNoTypeByBytesThatWritingChanges) {
+    constexpr std::size_t kIndicator = 0x1C + ma::rom::kPcirIndicator;
+    for (const auto& [place, word] : {std::pair(3U, "iSCSI"), {kIndicator, "FCoE"}}) {
+        Rom rom = test::madeRom({{PXE, 1}});
+        ma::writeLe16(rom, 0x40 + ma::rom::kPnpProduct, static_cast<std::uint16_t>(place));
+        std::copy_n(word, std::strlen(word), rom.begin() + place);
+        rom.back() = static_cast<std::uint8_t>(rom.back() - std::accumulate(rom.begin(), rom.end(), 0U));
+        const Rom next = test::madeRom({{UEFI, 2}});
+        // The first place leaves the image the last one, the second does not.
+        rom.insert(rom.end(), next.begin(), next.end());
+        const std::string found = test::describeRom(rom);
+        EXPECT_TRUE(found.starts_with("IMG_PXE 1")) << found;
+    }
 }
 
 TEST(OptionRomTest, NamesWhatIsBroken) {
@@ -123,6 +140,8 @@ std::vector<Case> allCases() {
     const Rom newAtZero = test::madeRom({{PXE, 1}, {iSCSI, 0}});
     const Rom olderAndMore = test::madeRom({{PXE, 0}, {iSCSI, 1}});
     const Rom clp = test::madeRom({{CLP, 1}});
+    Rom openFirmware = clp;
+    openFirmware[0x1C + ma::rom::kPcirCodeType] = ma::rom::CodeType::OpenFirmware;
     return {
         {"equal is fit", "eth0", virtio, {}, 0, {PXE, UEFI}, ""},
         {"one of two; type 0 and repeats ignored", "eth0", virtio, {PXE, None, PXE}, 0, {PXE}, ""},
@@ -145,6 +164,7 @@ std::vector<Case> allCases() {
         {"older with other types", "eth0", olderAndMore, {}, 4, {iSCSI, PXE}, "adapter carries"},
         {"missing type before older", "eth0", older, {iSCSI}, 5, {iSCSI}, "it has IMG_PXE, IMG_UEFI"},
         {"CLP brings its image's type", "eth0", clp, {CLP}, 4, {CLP, PXE}, "IMG_CLP, IMG_PXE"},
+        {"no code that runs here", "eth0", openFirmware, {CLP}, 5, {CLP}, "no image of type IMG_CLP"},
         {"VGA", "eth0", pxeFor(0x1041, {}, 0x030000), {}, 2, {}, "not for a network adapter"},
         {"listed device", "eth0", pxeFor(0x1000, {0x1041}), {}, 0, {PXE}, ""},
         {"not listed", "eth0", pxeFor(0x1000, {0x1042, 0x1043}), {}, 2, {}, "1af4:1000"},

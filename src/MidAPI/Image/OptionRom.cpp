@@ -28,18 +28,46 @@ std::string describe(std::size_t imageNumber, std::size_t imageOffset, const Fla
            utils::formatStr(" (offset 0x%zx)", imageOffset + flaw.offset);
 }
 
-/// The NUL-terminated text at an offset of the image; empty when there is none.
-std::string textAt(Bytes image, std::size_t offset) {
-    constexpr std::size_t kLongest = 255;
-    std::string text;
-    if (offset == 0) return text;
-    // These texts reach logs and terminals; a file may hold anything.
-    for (; offset < image.size() && image[offset] != 0 && text.size() < kLongest; ++offset) {
-        const char character = static_cast<char>(image[offset]);
-        text += character >= ' ' && character <= '~' ? character : '?';
+/// An image without the bytes that writing it may change: checksum, revision, last-image bit. They count as
+/// 0, since what tells the type must be the same when an image is checked and when it is written.
+class LastingBytes {
+  public:
+    LastingBytes(Bytes image, std::size_t dataStructure) : m_image(image), m_dataStructure(dataStructure) {}
+
+    std::size_t size() const { return m_image.size(); }
+    std::uint8_t operator[](std::size_t offset) const { return changes(offset) ? 0 : m_image[offset]; }
+    std::size_t number(std::size_t offset) const {
+        return static_cast<std::size_t>((*this)[offset] | (*this)[offset + 1] << 8);
     }
-    return text;
-}
+    /// Whether these bytes stand at an offset that has room for them.
+    bool holds(std::string_view bytes, std::size_t offset) const {
+        for (const char byte : bytes)
+            if ((*this)[offset++] != static_cast<std::uint8_t>(byte)) return false;
+        return true;
+    }
+    /// The NUL-terminated text at an offset of the image; empty when there is none.
+    std::string text(std::size_t offset) const {
+        constexpr std::size_t kLongest = 255;
+        std::string text;
+        if (offset == 0) return text;
+        // These texts reach logs and terminals; a file may hold anything.
+        for (; offset < size() && (*this)[offset] != 0 && text.size() < kLongest; ++offset) {
+            const char character = static_cast<char>(m_image[offset]);
+            text += character >= ' ' && character <= '~' ? character : '?';
+        }
+        return text;
+    }
+
+  private:
+    bool changes(std::size_t offset) const {
+        const std::size_t inData = offset - m_dataStructure;  // a huge number in front of it
+        return offset == rom::kHeaderChecksum || inData == rom::kPcirCodeRevision ||
+               inData == rom::kPcirCodeRevision + 1 || inData == rom::kPcirIndicator;
+    }
+
+    Bytes m_image;
+    std::size_t m_dataStructure;
+};
 
 bool contains(std::string_view text, std::string_view word) {
     const auto sameLetter = [](char a, char b) { return utils::lowerCase(a) == utils::lowerCase(b); };
@@ -55,24 +83,21 @@ utils::FirmwareType typeOfProduct(std::string_view product) {
 
 /// Follows the chain of Plug and Play headers to the first product name that tells a boot protocol; without
 /// one the first header's texts stay. An image without such a header is in order: older ones have none.
-void readPnp(Bytes image, RomImage& out) {
+void readPnp(const LastingBytes& image, RomImage& out) {
     out.type = utils::FirmwareType::PXE;
-    std::size_t offset = readLe16(image, rom::kHeaderPnp);
+    std::size_t offset = image.number(rom::kHeaderPnp);
     // Each header points to the next one: a chain may be a ring.
     for (int header = 0; header < rom::kMaxPnpHeaders && offset != 0; ++header) {
-        if (!fitsIn(offset, rom::kPnpLength, image.size())) return;
-        if (!std::equal(image.begin() + static_cast<std::ptrdiff_t>(offset),
-                        image.begin() + static_cast<std::ptrdiff_t>(offset + 4), "$PnP"))
-            return;
-        std::string product = textAt(image, readLe16(image, offset + rom::kPnpProduct));
+        if (!fitsIn(offset, rom::kPnpLength, image.size()) || !image.holds("$PnP", offset)) return;
+        std::string product = image.text(image.number(offset + rom::kPnpProduct));
         const utils::FirmwareType type = typeOfProduct(product);
         if (header == 0 || type != utils::FirmwareType::PXE) {
-            out.manufacturer = textAt(image, readLe16(image, offset + rom::kPnpManufacturer));
+            out.manufacturer = image.text(image.number(offset + rom::kPnpManufacturer));
             out.product = std::move(product);
             out.type = type;
         }
         if (type != utils::FirmwareType::PXE) return;
-        offset = readLe16(image, offset + rom::kPnpNext);
+        offset = image.number(offset + rom::kPnpNext);
     }
 }
 
@@ -140,7 +165,7 @@ MaybeFlaw readCode(Bytes image, RomImage& out) {
         const std::uint8_t sum = rom::sumOfImage(image);
         if (sum != 0)
             return Flaw{0, "the checksum is wrong: the bytes sum to " + std::to_string(sum) + ", not 0"};
-        readPnp(image, out);
+        readPnp({image, out.dataStructure}, out);
     } else if (out.codeType == rom::CodeType::Efi) {
         if (readLe32(image, rom::kHeaderEfiSignature) != rom::kEfiSignature)
             return Flaw{rom::kHeaderEfiSignature, "an EFI image without the EFI signature"};

@@ -42,7 +42,8 @@ struct QUENX_EXPORT RomImage {
 
     /// An image with a CLP entry point counts as IMG_CLP too, with the same revision and the same fate:
     /// choosing either type chooses the image.
-    bool isClp() const { return clpEntry != 0; }
+    /// Code of no type (type 0) carries nothing, whatever it points to.
+    bool isClp() const { return clpEntry != 0 && type != utils::FirmwareType{}; }
     bool isNetwork() const { return (classCode >> 16) == rom::kNetworkBaseClass; }
     /// True when the image was made for this device.
     bool fits(std::uint16_t vendor, std::uint16_t device) const;
