@@ -55,6 +55,8 @@ TEST(UsersFileTest, ChecksPasswords) {
         file, {{"admin", {host::hashPassword(odd), true}}, {"guest", {host::hashPassword("guest"), false}}});
     EXPECT_EQ(std::filesystem::status(file).permissions(), std::filesystem::perms(0600));
     host::UsersFile users(file);
+    for (const char control : {'\0', '\r', '\x7F'})
+        EXPECT_THROW(host::hashPassword(std::string("a") + control), std::runtime_error) << int{control};
     const auto admin = users.check({"admin", odd}, "");
     ASSERT_TRUE(admin);
     EXPECT_TRUE(admin->isAdministrator && admin->mayRead);

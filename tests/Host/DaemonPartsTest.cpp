@@ -30,6 +30,10 @@ using Words = std::vector<std::string>;
 
 TEST(SettingsTest, NameTheMistakesInTheFile) {
     const test::TempFolder folder;
+    const std::string large((std::size_t{1} << 20) + 1, '\n');
+    Settings unread;
+    EXPECT_THAT([&] { host::readSettingsFile("/dev/zero", unread); },
+                ThrowsMessage<std::runtime_error>(HasSubstr("/dev/zero is not a regular file.")));
     const std::pair<const char*, const char*> table[] = {
         {"[listen]\n\nhttps_port = 65536\n",
          ":3: listen.https_port is \"65536\". It must be a number from 0 to"},
@@ -43,6 +47,7 @@ TEST(SettingsTest, NameTheMistakesInTheFile) {
         {"https = true\n", "must be in a [section]"},
         {"[listen\n", ":1: "},
         {"[auth]\nmethod = users # two\n", ":2: "},
+        {large.c_str(), " is larger than 1 MiB"},
         {"[listen]\naddress = 127.0.0.1", ". A text must stand in quotes: address = \"127.0.0.1\""}};
     for (const auto& [content, expected] : table) {
         const std::string file = folder.write("bad", content);
@@ -264,6 +269,7 @@ TEST(ConfigCheckTest, LooksAtEveryFile) {
         {0, certificate, key, {"--listen-socket", folder / "socket"}},
         {2, certificate, key, {"--auth-method", "users", "--auth-users-file", "/nonexistent"}},
         {2, certificate, key, {"--providers-configuration", "/nonexistent"}},
+        {2, certificate, key, {"--providers-configuration", "/dev/zero"}},
         {2, certificate, key, {"--adapters-description", "/nonexistent", "--adapters-state", "/tmp"}},
         {2, certificate, key, {"--adapters-description", junk, "--adapters-state", "/tmp"}},
         // Where a start could not write is said, and not found out by the first update.

@@ -77,7 +77,8 @@ void writeUsersFile(const std::string& path, const UserEntries& users);
 /// Whether the name can stand in the file.
 bool isUserName(const std::string& name);
 
-/// A fresh hash of the password, by the strongest method of crypt(3). Throws std::runtime_error.
+/// A fresh hash of the password, by the strongest method of crypt(3). Throws std::runtime_error, also for one
+/// with control characters.
 std::string hashPassword(const std::string& password);
 
 /// Checks passwords against a users file. An unknown user takes as long as a wrong password.

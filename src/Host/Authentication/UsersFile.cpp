@@ -16,6 +16,7 @@
 
 #include "Host/Authentication/PasswordChecker.h"
 #include "Utils/Os/Linux/linux.h"
+#include "Utils/Utils.h"
 
 namespace host {
 
@@ -124,6 +125,13 @@ void writeUsersFile(const std::string& path, const UserEntries& users) {
 }
 
 std::string hashPassword(const std::string& password) {
+    // crypt(3) would take a NUL for the end, and a client can send no control character (RFC 7617 2).
+    if (std::ranges::any_of(password, utils::isControl)) {
+        throw std::runtime_error(
+            "The password holds a control character, so nothing was changed. Give it as one line of UTF-8, "
+            "with "
+            "neither NUL bytes nor carriage returns.");
+    }
     char setting[CRYPT_GENSALT_OUTPUT_SIZE];
     if (::crypt_gensalt_rn(nullptr, 0, nullptr, 0, setting, sizeof setting) == nullptr) {
         throw std::runtime_error(std::string("Cannot make a salt for the password: ") + std::strerror(errno));

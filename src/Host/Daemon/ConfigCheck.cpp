@@ -104,6 +104,8 @@ void checkProviderConfiguration(const std::string& path) {
         throw std::runtime_error("Cannot read " + path + ": " + std::strerror(errno) +
                                  ". Check providers.configuration.");
     }
+    if (!path.empty() && !fs::is_regular_file(path))
+        throw std::runtime_error(path + " is not a regular file. Check providers.configuration.");
 }
 
 void checkAdapters(const Settings& settings) {

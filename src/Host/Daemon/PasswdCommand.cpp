@@ -84,6 +84,10 @@ void change(const PasswdRequest& request) {
                                  "\" cannot be a user name. Use 1 to 64 printable ASCII characters, without "
                                  "blanks or colons, and do not start with #.");
     }
+    // The new file would take the link's place, and the one behind it keep its users.
+    if (std::filesystem::is_symlink(request.usersFile))
+        throw std::runtime_error(request.usersFile +
+                                 " is a symbolic link. Name the file itself with --users.");
     // Read before the password is asked for, so that a broken file does not cost a password typed twice.
     usersOf(request.usersFile);
     // And asked for before the lock, which nobody may hold for as long as a person thinks.
