@@ -34,6 +34,7 @@ TEST_F(WrongUseTest, RefusesBadFilesWithTheReason) {
     expectRefusal("%n%s\n.rom", "%n%s\\x0a.rom: No such file or directory.", 4);
     expectRefusal(m_folder.path(), "is a directory.\nName a complete firmware image.");
     expectRefusal(fifo, "is not a regular file.");
+    expectError("adapters --config " + fifo, 2, "The configuration file " + fifo + " is not a regular file.");
     expectRefusal(huge, "is larger than 2 GiB.");
     expectRefusal(m_folder.write("empty", ""), "is empty.");
     expectRefusal(m_folder.write("cut", cut), "is not a complete firmware image: ");

@@ -20,6 +20,9 @@ void requireReadable(const std::string& file, const std::string& what) {
     if (std::filesystem::is_directory(file, error))
         throw CommandError(ExitStatus::WrongUse, "The " + what + " " + file + " is a directory.",
                            "Name a file.");
+    if (std::filesystem::is_other(file, error))
+        throw CommandError(ExitStatus::WrongUse, "The " + what + " " + file + " is not a regular file.",
+                           "Name a file.");
     if (access(file.c_str(), R_OK) == 0) return;
     const Explanation why = cannotRead("the " + what + " " + file, errno);
     throw CommandError(ExitStatus::WrongUse, why.message, why.advice);

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Utils/Os/Linux/SMASHv2Config.h"
 
+#include <filesystem>
 #include <fstream>
 #include <locale>
 #include <sstream>
@@ -45,10 +46,18 @@ bool isSkipped(const std::string& line) {
 /// what else goes wrong is thrown.
 template <class Take>
 void readSettings(const std::string& path, Take take) {
+    // To open a pipe would wait for somebody to write into it, and a device may never end.
+    std::error_code error;
+    if (!std::filesystem::is_regular_file(path, error)) return;
     std::ifstream file(path);
     // A stream keeps exceptions to itself unless asked, and without memory the rest would go missing unsaid.
     file.exceptions(std::ios::badbit);
     try {
+        // Editors of other systems put a byte order mark in front, which is no part of the first key.
+        if (std::string mark(3, '\0'); !file.read(mark.data(), 3) || mark != "\xEF\xBB\xBF") {
+            file.clear();
+            file.seekg(0);
+        }
         for (std::string line; std::getline(file, line);) {
             if (isSkipped(line)) continue;
             // Everywhere, values included: so "Key=value" and "Key = value" read alike.
@@ -62,7 +71,7 @@ void readSettings(const std::string& path, Take take) {
             take(key, words);
         }
     } catch (const std::ios::failure&) {
-        // A folder in its place, or a medium that fails: as good as no file.
+        // A medium that fails: as good as no file.
     }
 }
 

@@ -25,6 +25,13 @@ struct SMASHv2ConfigTest : ::testing::Test {
 
 }  // namespace
 
+TEST_F(SMASHv2ConfigTest, WaitsForNoPipeAndSkipsAByteOrderMark) {
+    ASSERT_EQ(mkfifo((folder / "fifo").c_str(), 0600), 0);
+    EXPECT_EQ(SMASHv2Config(folder / "fifo").getLockerTimeout(), 300000U);
+    write("\xEF\xBB\xBFOEMCustomizeable=5\n");
+    EXPECT_FALSE(config.isDowngradeEnabled());
+}
+
 TEST_F(SMASHv2ConfigTest, ReadsAndLogsEachLine) {
     const struct {
         const char* line;
