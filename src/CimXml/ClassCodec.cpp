@@ -12,6 +12,19 @@ using core::Qualifier;
 
 // Reading.
 
+/// A name ends up in the MOF that is made of a class, outside of any quotes.
+std::string readName(const pugi::xml_node& element, const char* attribute) {
+    std::string name = requiredAttribute(element, attribute);
+    // What is read as a path is its class alone, or no name.
+    if (name.empty() || core::CimPath(name).getClassName() != name)
+        refuseElement(element, std::string("has no valid name in ") + attribute);
+    return name;
+}
+
+std::string readOptionalName(const pugi::xml_node& element, const char* attribute) {
+    return std::string_view(element.attribute(attribute).value()).empty() ? "" : readName(element, attribute);
+}
+
 CimType requireType(const pugi::xml_node& element) {
     const auto type = readType(element, "TYPE");
     if (!type) refuseElement(element, "has no attribute TYPE");
@@ -30,7 +43,7 @@ Qualifier readQualifier(const pugi::xml_node& element) {
     // A QUALIFIER does not say whether it is an array, only its value does; null counts as a single one.
     auto value = readValue(element, requireType(element), std::nullopt, KeyTyping::ByAttributes);
     if (!value) refuseElement(element, "holds no value of its type");
-    return {requiredAttribute(element, "NAME"), std::move(*value), isTrue(element.attribute("PROPAGATED"))};
+    return {readName(element, "NAME"), std::move(*value), isTrue(element.attribute("PROPAGATED"))};
 }
 
 std::vector<Qualifier> readQualifiers(const pugi::xml_node& element) {
@@ -54,10 +67,10 @@ Declaration readTyped(const pugi::xml_node& element) {
     const std::string_view suffix = name.substr(std::min(name.find('.'), name.size()));
     const bool isReference = suffix == ".REFERENCE" || suffix == ".REFARRAY";
     Declaration declaration{};
-    declaration.name = requiredAttribute(element, "NAME");
+    declaration.name = readName(element, "NAME");
     declaration.type = isReference ? CimType::Reference : requireType(element);
     declaration.isArray = suffix == ".ARRAY" || suffix == ".REFARRAY";
-    if (isReference) declaration.referenceClass = element.attribute("REFERENCECLASS").value();
+    if (isReference) declaration.referenceClass = readOptionalName(element, "REFERENCECLASS");
     declaration.qualifiers = readQualifiers(element);
     return declaration;
 }
@@ -84,7 +97,7 @@ core::ParameterDeclaration readParameter(const pugi::xml_node& element) {
 }
 
 core::MethodDeclaration readMethod(const pugi::xml_node& element) {
-    core::MethodDeclaration method{requiredAttribute(element, "NAME"), requireType(element), {}};
+    core::MethodDeclaration method{readName(element, "NAME"), requireType(element), {}};
     readOrigin(element, method);
     method.qualifiers = readQualifiers(element);
     for (const pugi::xml_node& child : childElements(element)) {
@@ -170,8 +183,8 @@ void writeMethod(XmlWriter& writer, const core::MethodDeclaration& method) {
 core::ClassDeclaration readClass(const pugi::xml_node& element) {
     expectElement(element, "CLASS");
     core::ClassDeclaration result;
-    result.name = requiredAttribute(element, "NAME");
-    result.superclass = element.attribute("SUPERCLASS").value();
+    result.name = readName(element, "NAME");
+    result.superclass = readOptionalName(element, "SUPERCLASS");
     result.qualifiers = readQualifiers(element);
     result.isAssociation = isSet(result.qualifiers, "Association");
     for (const pugi::xml_node& child : childElements(element)) {

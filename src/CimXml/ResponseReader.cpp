@@ -33,6 +33,17 @@ core::PropertyValue readProperty(const pugi::xml_node& element) {
     return property;
 }
 
+/// Sorted, since a server may send many thousands.
+template <class Elements>
+std::vector<std::string> foldedNames(const Elements& elements) {
+    std::vector<std::string> names;
+    names.reserve(elements.size());
+    for (const auto& element : elements)
+        names.push_back(core::foldName(element.name));
+    std::ranges::sort(names);
+    return names;
+}
+
 core::InstanceValue readInstance(const pugi::xml_node& element) {
     expectElement(element, "INSTANCE");
     core::InstanceValue instance;
@@ -40,13 +51,17 @@ core::InstanceValue readInstance(const pugi::xml_node& element) {
     for (const pugi::xml_node& child : childElements(element)) {
         if (!isElement(child, "QUALIFIER")) instance.properties.push_back(readProperty(child));
     }
+    const std::vector<std::string> names = foldedNames(instance.properties);
+    if (std::ranges::adjacent_find(names) != names.end())
+        refuseElement(element, "has two properties of one name");
     return instance;
 }
 
 /// An INSTANCE does not say which of its properties are keys; the path in front of it does.
 void markKeys(core::InstanceValue& instance) {
+    const std::vector<std::string> keys = foldedNames(instance.path.getKeys());
     for (core::PropertyValue& property : instance.properties)
-        property.isKey = core::findByName(instance.path.getKeys(), property.name) != nullptr;
+        property.isKey = std::ranges::binary_search(keys, core::foldName(property.name));
 }
 
 /// VALUE.NAMEDINSTANCE, VALUE.OBJECTWITHPATH, VALUE.INSTANCEWITHPATH.

@@ -2,12 +2,14 @@
 // quenxctl: reads the arguments, opens the way to the model, runs the verb, says what went wrong.
 #include <unistd.h>
 
+#include <array>
 #include <atomic>
 #include <cerrno>
 #include <chrono>
 #include <csignal>
 #include <cstring>
 #include <iostream>
+#include <optional>
 #include <string_view>
 #include <thread>
 
@@ -24,19 +26,40 @@ constexpr const char* kAskLog = "The system log has the details.";
 std::atomic<bool> interruptionAsked{false};
 static_assert(std::atomic<bool>::is_always_lock_free, "a signal handler stores it");
 
-/// An update in this process would die with it, and one on a server goes on unseen: so Ctrl-C is only noted.
-void noteInterruptions() {
-    struct sigaction action = {};
-    action.sa_handler = [](int) { interruptionAsked = true; };
-    action.sa_flags = SA_RESTART;  // a read or write under way is not what the user wants to stop
-    for (const int signal : {SIGINT, SIGTERM, SIGHUP})
-        sigaction(signal, &action, nullptr);
-    // If the reader of a pipe has gone, or a file may not grow, writing fails, and the update goes on; so it
-    // does after a signal that means nothing here.
-    action.sa_handler = SIG_IGN;
-    for (const int signal : {SIGPIPE, SIGXFSZ, SIGUSR1, SIGUSR2, SIGALRM, SIGVTALRM, SIGPROF, SIGIO, SIGPWR})
-        sigaction(signal, &action, nullptr);
+constexpr std::array kInterruptions = {SIGINT, SIGTERM, SIGHUP};
+
+/// What the signals did before they were noted; "nohup", for one, has SIGHUP ignored.
+std::array<struct sigaction, kInterruptions.size()> usualActions = {};
+
+/// For the time when nothing can be harmed: nobody may ever read what is printed then.
+void letInterruptionsEnd() {
+    for (std::size_t i = 0; i < kInterruptions.size(); ++i)
+        sigaction(kInterruptions[i], &usualActions[i], nullptr);
 }
+
+/// An update in this process would die with it, and one on a server goes on unseen: so Ctrl-C is only noted,
+/// as long as this lives.
+class NotedInterruptions {
+  public:
+    /// @param isOnServer  then a second one ends the program, wherever it waits
+    explicit NotedInterruptions(bool isOnServer) {
+        struct sigaction action = {};
+        action.sa_handler = [](int) { interruptionAsked = true; };
+        // A read or write under way is not what the user wants to stop.
+        action.sa_flags = SA_RESTART | (isOnServer ? static_cast<int>(SA_RESETHAND) : 0);
+        for (std::size_t i = 0; i < kInterruptions.size(); ++i)
+            sigaction(kInterruptions[i], &action, &usualActions[i]);
+        // If the reader of a pipe has gone, or a file may not grow, writing fails, and the update goes on; so
+        // it does after a signal that means nothing here.
+        action.sa_handler = SIG_IGN;
+        for (const int signal :
+             {SIGPIPE, SIGXFSZ, SIGUSR1, SIGUSR2, SIGALRM, SIGVTALRM, SIGPROF, SIGIO, SIGPWR})
+            sigaction(signal, &action, nullptr);
+    }
+    ~NotedInterruptions() { letInterruptionsEnd(); }
+    NotedInterruptions(const NotedInterruptions&) = delete;
+    NotedInterruptions& operator=(const NotedInterruptions&) = delete;
+};
 
 std::string adviceFor(const core::CimError& error) {
     switch (error.status()) {
@@ -64,10 +87,12 @@ ExitStatus statusFor(core::CimStatus status) {
     return isMissing ? ExitStatus::NotFound : ExitStatus::Failed;
 }
 
-/// An error text of the model or a server, which may be no more than a few words, as a sentence.
+/// An error text of the model or a server, which may be no more than a few words, as a sentence. What begins
+/// with a path or a name of code keeps its letters.
 std::string sentence(std::string text) {
     if (text.empty()) return "The service gave no reason.";
-    if (text.front() >= 'a' && text.front() <= 'z')
+    const std::size_t end = std::string_view(text).find_first_of(" :=.");
+    if (text.front() >= 'a' && text.front() <= 'z' && (end == std::string::npos || text[end] == ' '))
         text.front() = static_cast<char>(text.front() - 'a' + 'A');
     if (std::string_view(".!?").find(text.back()) == std::string_view::npos) text += '.';
     return text;
@@ -89,11 +114,13 @@ ExitStatus runVerb(const Arguments& arguments) {
     LinePrinter printer(arguments.json ? std::cerr : std::cout,
                         Terminal::of(arguments.json ? STDERR_FILENO : STDOUT_FILENO));
     ProgressDisplay progress(printer);
+    // Outlives the connection, which waits for the updates of this process.
+    std::optional<NotedInterruptions> interruptions;
     const Connection connection = arguments.server.url
                                       ? openServer(arguments.server, [] { return interruptionAsked.load(); })
                                       : openProviders(arguments.providers);
     // Only now: at the prompt for the password, Ctrl-C still ends the program.
-    if (arguments.startsUpdate()) noteInterruptions();
+    if (arguments.startsUpdate()) interruptions.emplace(!connection.isInProcess);
     // Polling costs a server a request each time; in process it is free.
     const std::chrono::milliseconds pause(connection.isInProcess ? 50 : 500);
     const Following following = {.pause = [pause] { std::this_thread::sleep_for(pause); },
@@ -102,7 +129,8 @@ ExitStatus runVerb(const Arguments& arguments) {
                                          return untilTheEnd ? interruptionAsked.exchange(false)
                                                             : interruptionAsked.load();
                                      },
-                                 .untilTheEnd = connection.isInProcess};
+                                 .untilTheEnd = connection.isInProcess,
+                                 .over = letInterruptionsEnd};
     Context context{.connection = connection,
                     .out = std::cout,
                     .error = std::cerr,

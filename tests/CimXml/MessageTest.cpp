@@ -78,6 +78,14 @@ TEST(RequestReaderTest, KeepsTextsAsTheyAre) {
         EXPECT_EQ(held<std::string>(cimxml::readRequest(parameterWith(text)), "P"), expected);
 }
 
+/// A path whose key is a path, and so on.
+std::string nested(int levels) {
+    return "<INSTANCENAME CLASSNAME='C'>" +
+           (levels == 0 ? "<KEYVALUE>\"</KEYVALUE>"
+                        : "<VALUE.REFERENCE>" + nested(levels - 1) + "</VALUE.REFERENCE>") +
+           "</INSTANCENAME>";
+}
+
 TEST(RequestReaderTest, RefusesEachFaultByItsName) {
     const std::string good = test::readSample("w-GetInstance.xml");
     const auto changed = [&](const std::string& from, const std::string& to) {
@@ -85,6 +93,8 @@ TEST(RequestReaderTest, RefusesEachFaultByItsName) {
         EXPECT_NE(text.find(from), std::string::npos) << from;
         return text.replace(text.find(from), from.size(), to);
     };
+    // Its text is 2^n quotes long.
+    held<CimPath>(cimxml::readRequest(parameterWith(nested(3))), "P");
     const std::string place = "<LOCALNAMESPACEPATH><NAMESPACE NAME='root'/></LOCALNAMESPACEPATH>";
     const std::pair<const char*, std::vector<std::string>> table[] = {
         {"unsupported-cim-version", {changed("CIMVERSION=\"2.0\"", "CIMVERSION=\"3.0\"")}},
@@ -100,7 +110,9 @@ TEST(RequestReaderTest, RefusesEachFaultByItsName) {
           wrapped("<OTHERCALL/>"), wrapped("<IMETHODCALL NAME='X'/>"),
           wrapped("<IMETHODCALL NAME='X'><LOCALNAMESPACEPATH/></IMETHODCALL>"),
           wrapped("<METHODCALL NAME='X'>" + place + "</METHODCALL>"), parameterWith("<VALUE/><VALUE/>"),
-          parameterWith("<VALUE><B/></VALUE>"), parameterWith("<UNKNOWN/>"),
+          parameterWith("<VALUE><B/></VALUE>"), parameterWith("<UNKNOWN/>"), parameterWith(nested(4)),
+          parameterWith("<VALUE.REFARRAY><VALUE.REFERENCE>" + nested(4) +
+                        "</VALUE.REFERENCE></VALUE.REFARRAY>"),
           parameterWith("<VALUE.ARRAY><CLASSNAME NAME='x'/></VALUE.ARRAY>"),
           parameterWith("<INSTANCENAME CLASSNAME='C'><KEYVALUE>1</KEYVALUE>"
                         "<KEYVALUE>2</KEYVALUE></INSTANCENAME>")}},
@@ -213,6 +225,13 @@ TEST(ResponseReaderTest, RefusesWhatIsNoResponse) {
     for (const std::string& bad :
          {std::string("<html/>"), inside("<IMETHODCALL NAME='X'/>"),
           inside("<IMETHODRESPONSE NAME='X'><ERROR CODE='six'/></IMETHODRESPONSE>"),
+          inside("<IMETHODRESPONSE NAME='X'><IRETURNVALUE>" + nested(4) +
+                 "</IRETURNVALUE></IMETHODRESPONSE>"),
+          inside(
+              "<IMETHODRESPONSE NAME='X'><IRETURNVALUE><INSTANCE CLASSNAME='C'><PROPERTY NAME='P' "
+              "TYPE='uint8'/><PROPERTY NAME='p' TYPE='uint8'/></INSTANCE></IRETURNVALUE></IMETHODRESPONSE>"),
+          inside("<IMETHODRESPONSE NAME='X'><IRETURNVALUE><CLASS NAME='A{};&#10;#pragma include'/>"
+                 "</IRETURNVALUE></IMETHODRESPONSE>"),
           inside("<IMETHODRESPONSE NAME='X'><IRETURNVALUE><NEW/></IRETURNVALUE></IMETHODRESPONSE>"),
           inside("<METHODRESPONSE NAME='X'><RETURNVALUE><VALUE>x</VALUE></RETURNVALUE></METHODRESPONSE>"),
           inside("<IMETHODRESPONSE NAME='X'><IRETURNVALUE><INSTANCE CLASSNAME='C'><PROPERTY NAME='P' "

@@ -1,5 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
+#include <fcntl.h>
 #include <gtest/gtest.h>
+#include <unistd.h>
 
 #include <filesystem>
 #include <sstream>
@@ -55,10 +57,15 @@ TEST(OutputTest, CutsAlignsAndDisarmsText) {
     EXPECT_EQ(cli::elideMiddle("äöüäöüäöüä", 8), "äöü...üä");
     EXPECT_EQ(cli::printable("\x7F\xC2\x9B\x80 \xC2\xA0\xE2\x82\xAC"),
               "\\x7f\\xc2\\x9b\\x80 \xC2\xA0\xE2\x82\xAC");
-    EXPECT_EQ(cli::printable("\xE2\x80\xA9\xE2\x80\xAE\xE2\x81\xA6\xE2\x81"),
-              "\xE2\x80\xA9\\xe2\\x80\\xae\\xe2\\x81\\xa6\\xe2\\x81");
+    EXPECT_EQ(cli::printable("\xE2\x80\xB0\xE2\x80\xAE\xE2\x81\xA6\xE2\x81"),
+              "\xE2\x80\xB0\\xe2\\x80\\xae\\xe2\\x81\\xa6\\xe2\\x81");
+    for (const std::string hidden : {"\xC2\xAD", "\xD8\x9C", "\xE2\x80\x8F", "\xE2\x80\xA8", "\xEF\xBB\xBF"})
+        EXPECT_TRUE(cli::printable(hidden).starts_with("\\x")) << hidden;
     std::ostringstream out;
     cli::printTable(out, {{"A", "B"}, {"long\n\x1b", "x"}, {"größe", "y"}, {"", ""}});
+    std::ostringstream wide;
+    cli::printTable(wide, {{std::string(100000, 'x'), "a"}, {"y", "b"}});
+    EXPECT_LT(wide.str().size(), 100300U);
     EXPECT_EQ(out.str(), "A             B\nlong\\x0a\\x1b  x\ngröße         y\n              \n");
 }
 
@@ -91,6 +98,20 @@ std::string show(const std::vector<unsigned>& percentages) {
     }
     display.ended();
     return out.str();
+}
+
+TEST(ProgressTest, WaitsForNobodyWhoDoesNotRead) {
+    int pipe[2] = {};
+    ASSERT_EQ(::pipe2(pipe, O_NONBLOCK), 0);
+    const std::string piece(4096, 'x');
+    while (::write(pipe[1], piece.data(), piece.size()) > 0) {
+    }
+    std::ostringstream out;
+    cli::LinePrinter(out, {false, pipe[1]}).print("lost");
+    cli::LinePrinter(out, {true, pipe[1]}).rewrite("lost");
+    EXPECT_EQ(out.str(), "");
+    ::close(pipe[0]);
+    ::close(pipe[1]);
 }
 
 TEST(ProgressTest, WritesPlainLinesAndIsNotSilentWhenNothingMoves) {

@@ -54,6 +54,8 @@ class FakeService : public core::CimOperations {
     bool isCalled = false;
     bool needsJob = true;
     bool answersTheCall = true;
+    bool hasMemory = true;
+    std::string jobNamespace;
     bool isReadable = true;  ///< what is installed, after the job
 
     const std::string& getNamespace() const override { return m_namespace; }
@@ -90,9 +92,12 @@ class FakeService : public core::CimOperations {
                                     const std::vector<core::Argument>&) override {
         isCalled = true;
         if (!answersTheCall) throw cli::NoAnswer(ExitStatus::Failed, "No answer.", "Wait.");
+        if (!hasMemory) throw std::bad_alloc();
         if (!needsJob) installed = installedAfterJob;
         if (!needsJob) return {0, {}};
-        return {4096, {{"Job", CimValue::of(CimType::Reference, job(2, 0).path)}}};
+        CimPath path = job(2, 0).path;
+        path.setNamespace(jobNamespace);
+        return {4096, {{"Job", CimValue::of(CimType::Reference, path)}}};
     }
     void deleteInstance(const CimPath&) override {}
     core::ClassChain getClass(const std::string&) override { return {}; }
@@ -155,6 +160,39 @@ TEST_F(InstallVerbTest, CallsNothingAFailureWhoseOutcomeItDoesNotKnow) {
               "quenxctl: No answer. The update of eth0 may have begun.\n"
               "\"quenxctl jobs\" shows whether it runs, \"quenxctl adapters\" which firmware is there. Look "
               "before you install again.\n");
+    m_service->answersTheCall = true;
+    m_service->hasMemory = false;
+    EXPECT_EQ(install(), ExitStatus::Unknown);
+}
+
+TEST_F(InstallVerbTest, TakesNoOtherJobForItsOwn) {
+    const auto startedAt = [](InstanceValue view, int second) {
+        view.properties.push_back(
+            {"StartTime", CimValue::of(CimType::Datetime, utils::Time(2026, 1, 2, 3, 4, second)), false, {}});
+        return view;
+    };
+    const auto statusAfter = [&](std::deque<InstanceValue> looks) {
+        m_service->installed = kOld;
+        m_service->jobs = std::move(looks);
+        // What is missing is told by an exception, what is left over by the outcome.
+        try {
+            return install();
+        } catch (const cli::CommandError& error) {
+            return error.status();
+        }
+    };
+    EXPECT_EQ(statusAfter({startedAt(job(4, 40), 5), startedAt(job(7, 100), 5)}), ExitStatus::Done);
+    EXPECT_EQ(statusAfter({startedAt(job(4, 40), 5), startedAt(job(7, 100), 6)}), ExitStatus::Unknown);
+    // A state that 16 bits would cut to 7.
+    EXPECT_EQ(statusAfter(std::deque<InstanceValue>(20, job(65543, 100))), ExitStatus::Unknown);
+    m_service->jobNamespace = "root/other";
+    EXPECT_EQ(statusAfter({job(7, 100)}), ExitStatus::Unknown);
+}
+
+TEST_F(InstallVerbTest, AsksTheServiceWhetherAClpEntryMayBeLost) {
+    m_service->installed = {component("IMG_CLP", 2), component("IMG_PXE", 2), component("IMG_UEFI", 1)};
+    install();
+    EXPECT_TRUE(m_service->isCalled);
 }
 
 TEST_F(InstallVerbTest, BelievesNoSuccessThatCannotBeSeen) {

@@ -121,6 +121,43 @@ TEST(RemoteConnectionTest, TakesNoAnswerForAnotherRequestsOrForNothing) {
         EXPECT_THAT([&] { call(row.first); }, ThrowsMessage<cli::NoAnswer>(StrEq(row.second)));
     const LoopbackServer server(message("1", "<METHODRESPONSE NAME='EnumerateInstanceNames'>" + returned));
     EXPECT_THROW(server.connect().operations->enumerateInstanceNames("Y"), cli::NoAnswer);
+    const LoopbackServer confused(
+        message("1",
+                "<IMETHODRESPONSE NAME='GetInstance'><IRETURNVALUE><INSTANCE CLASSNAME='Y'><PROPERTY "
+                "NAME='name' TYPE='string'><VALUE>2</VALUE></PROPERTY></INSTANCE></IRETURNVALUE>"
+                "</IMETHODRESPONSE>"));
+    EXPECT_THAT([&] { confused.connect().operations->getInstance(core::CimPath("Y.Name=\"1\"")); },
+                ThrowsMessage<cli::NoAnswer>(HasSubstr("is about another object than Y.Name=\"1\".")));
+}
+
+TEST(RemoteConnectionTest, SendsAChangeOnce) {
+    const struct {
+        int connections;
+        const char* said;
+        void (*call)(core::CimOperations& operations, const core::CimPath& path);
+    } table[] = {
+        {2, "cannot be read", [](auto& operations, const auto& path) { operations.getInstance(path); }},
+        {1, "without an answer.",
+         [](auto& operations, const auto& path) { operations.invokeMethod(path, "X", {}); }},
+        {1, "without an answer.",
+         [](auto& operations, const auto& path) { operations.deleteInstance(path); }},
+    };
+    const core::CimPath path("Y.Name=\"1\"");
+    for (const auto& row : table) {
+        std::atomic<int> made{0};
+        const LoopbackServer server([&](int client, const std::string&) {
+            ++made;
+            // The connection is kept; the next request on it is taken, and gets no answer.
+            LoopbackServer::sendBytes(client, "HTTP/1.1 200 OK\r\nContent-Length: 0\r\n\r\n");
+            std::array<char, 4096> bytes{};
+            ::recv(client, bytes.data(), bytes.size(), 0);
+        });
+        const cli::Connection connection = server.connect();
+        EXPECT_THROW(row.call(*connection.operations, path), cli::NoAnswer);
+        EXPECT_THAT([&] { row.call(*connection.operations, path); },
+                    ThrowsMessage<cli::NoAnswer>(HasSubstr(row.said)));
+        EXPECT_EQ(made, row.connections);
+    }
 }
 
 std::string classBelow(const std::string& name, const std::string& superclass) {

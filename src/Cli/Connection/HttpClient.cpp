@@ -4,6 +4,7 @@
 #include <arpa/inet.h>
 
 #include <cstdlib>
+#include <limits>
 #include <string_view>
 
 #include "CimXml/Request.h"
@@ -49,6 +50,11 @@ std::size_t takeBody(char* data, std::size_t, std::size_t count, void* to) {
 
 int stopIfInterrupted(void* isInterrupted, curl_off_t, curl_off_t, curl_off_t, curl_off_t) {
     return (*static_cast<std::function<bool()>*>(isInterrupted))() ? 1 : 0;
+}
+
+/// Asked before each attempt to send a request.
+int countAttempt(void* attempts, char*, char*, int, int) {
+    return --*static_cast<int*>(attempts) < 0 ? CURL_PREREQFUNC_ABORT : CURL_PREREQFUNC_OK;
 }
 
 std::size_t takeHeader(char* data, std::size_t, std::size_t count, void* to) {
@@ -99,6 +105,36 @@ void refuseLargeAnswer(const std::string& url, std::size_t limit) {
         "The answer of " + url + " is larger than " + std::to_string(limit >> 20) +
             " MiB and was not read to its end.",
         "Ask for less, such as a class further down, or check that --server names a CIM-XML server.");
+}
+
+void requireOk(const HttpReply& reply) {
+    // It may be a date, too.
+    const bool isInSeconds = utils::parseNumber<std::uint32_t>(reply.retryAfter).has_value();
+    const std::string wait = isInSeconds ? reply.retryAfter + " seconds" : "a while";
+    const std::string why = reply.cimError.empty() ? "" : " (" + reply.cimError + ")";
+    switch (reply.status) {
+        // CIM errors come with it, too: any other status is about the way there.
+        case 200:
+            return;
+        case 401:
+            throw CommandError(ExitStatus::Failed, "The server does not accept the user name and password.",
+                               "Check --user or QUENXCTL_USER, and QUENXCTL_PASSWORD or what was typed.");
+        case 403:
+            throw CommandError(
+                ExitStatus::Failed, "This user may not use the server.",
+                "On quenx-cimd, log in as root, as a member of the group quenx-admin, or as a user whom "
+                "its setting auth.readers names.");
+        case 503:
+            throw CommandError(
+                ExitStatus::Failed,
+                "The server is busy, or it blocks log-ins from this address for a while after wrong "
+                "passwords.",
+                "Try again in " + wait + ".");
+        default:
+            throw NoAnswer(ExitStatus::Failed,
+                           "The server answered with HTTP status " + std::to_string(reply.status) + why + ".",
+                           "Check that --server names a CIM-XML server; its log has the details.");
+    }
 }
 
 ServerUrl::ServerUrl(const std::string& text) {
@@ -157,6 +193,9 @@ HttpClient::HttpClient(const ServerSettings& settings, const std::string& user, 
     set(CURLOPT_NOPROGRESS, 0L);
     set(CURLOPT_XFERINFODATA, &m_isInterrupted);
     set(CURLOPT_XFERINFOFUNCTION, &stopIfInterrupted);
+    // The library repeats a request by itself when a kept connection is closed without an answer.
+    set(CURLOPT_PREREQFUNCTION, &countAttempt);
+    set(CURLOPT_PREREQDATA, &m_attempts);
     if (!m_isLocal) {
         // The one scheme that every WBEM server has. Naming it saves a first request that would be refused.
         set(CURLOPT_HTTPAUTH, CURLAUTH_BASIC);
@@ -172,8 +211,10 @@ HttpClient::HttpClient(const ServerSettings& settings, const std::string& user, 
     }
 }
 
-HttpReply HttpClient::post(const std::vector<std::string>& headers, const std::string& body) {
+HttpReply HttpClient::post(const std::vector<std::string>& headers, const std::string& body,
+                           Sending sending) {
     HttpReply reply;
+    m_attempts = sending == Sending::Once ? 1 : std::numeric_limits<int>::max();
     std::unique_ptr<curl_slist, decltype(&curl_slist_free_all)> list(nullptr, curl_slist_free_all);
     for (const std::string& header : headers)
         list.reset(curl_slist_append(list.release(), header.c_str()));
@@ -195,6 +236,10 @@ void HttpClient::refuse(CURLcode code, bool isTooLarge) const {
     if (code == CURLE_SSL_CACERT_BADFILE && !m_namesCaFile) code = CURLE_PEER_FAILED_VERIFICATION;
     long sent = 0;
     curl_easy_getinfo(m_curl.get(), CURLINFO_REQUEST_SIZE, &sent);
+    if (m_attempts < 0) {
+        throw NoAnswer(ExitStatus::Failed, m_url + " closed the connection without an answer.",
+                       "Check the server's log, and try again.");
+    }
     if (code == CURLE_ABORTED_BY_CALLBACK) {
         const std::string what = "Interrupted while waiting for the server.";
         if (sent > 0) throw NoAnswer(ExitStatus::Interrupted, what, "");

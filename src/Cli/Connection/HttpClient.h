@@ -24,8 +24,16 @@ struct HttpReply {
     std::string retryAfter;   ///< likewise, in seconds
 };
 
+/// Throws CommandError, for a reply that is no answer to the request itself. NoAnswer where the server may
+/// have carried it out.
+void requireOk(const HttpReply& reply);
+
 /// Throws NoAnswer that says so.
 [[noreturn]] void refuseLargeAnswer(const std::string& url, std::size_t limit);
+
+/// Whether a request may be sent again when a kept connection turns out to be closed. What changes something,
+/// or takes something away, must not be: the server may have carried it out.
+enum class Sending { AsOftenAsNeeded, Once };
 
 /// Requests to one server over one connection. Used from one thread.
 class HttpClient {
@@ -37,7 +45,7 @@ class HttpClient {
 
     /// Sends a body of XML. Throws CommandError when it could not be sent, NoAnswer when only the answer is
     /// missing.
-    HttpReply post(const std::vector<std::string>& headers, const std::string& body);
+    HttpReply post(const std::vector<std::string>& headers, const std::string& body, Sending sending);
 
   private:
     template <class T>
@@ -52,6 +60,7 @@ class HttpClient {
     bool m_isLocal;  ///< over a Unix socket
     bool m_namesCaFile;
     std::function<bool()> m_isInterrupted;
+    int m_attempts = 0;  ///< that the library may still make; negative when it was kept from one
 };
 
 }  // namespace cli

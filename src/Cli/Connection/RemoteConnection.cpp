@@ -14,6 +14,7 @@
 #include "CimXml/WireError.h"
 #include "Cli/Connection/HttpClient.h"
 #include "Cli/Display/Messages.h"
+#include "Framework/Requests/AnswerMeter.h"
 #include "Utils/Os/Linux/EchoOff.h"
 #include "Utils/Utils.h"
 
@@ -58,42 +59,36 @@ Parameters referenceParameters(const core::CimPath& path, const core::Associatio
     return associatorParameters(path, {"", associationClass, by.role, ""});
 }
 
-void requireOk(const HttpReply& reply) {
-    const std::string wait = reply.retryAfter.empty() ? "a while" : reply.retryAfter + " seconds";
-    const std::string why = reply.cimError.empty() ? "" : " (" + reply.cimError + ")";
-    switch (reply.status) {
-        // CIM errors come with it, too: any other status is about the way there.
-        case 200:
-            return;
-        case 401:
-            throw CommandError(ExitStatus::Failed, "The server does not accept the user name and password.",
-                               "Check --user or QUENXCTL_USER, and QUENXCTL_PASSWORD or what was typed.");
-        case 403:
-            throw CommandError(
-                ExitStatus::Failed, "This user may not use the server.",
-                "On quenx-cimd, log in as root, as a member of the group quenx-admin, or as a user whom "
-                "its setting auth.readers names.");
-        case 503:
-            throw CommandError(
-                ExitStatus::Failed,
-                "The server is busy, or it blocks log-ins from this address for a while after wrong "
-                "passwords.",
-                "Try again in " + wait + ".");
-        default:
-            throw NoAnswer(ExitStatus::Failed,
-                           "The server answered with HTTP status " + std::to_string(reply.status) + why + ".",
-                           "Check that --server names a CIM-XML server; its log has the details.");
-    }
-}
-
 [[noreturn]] void refuseAnswer(const std::string& why) {
     throw NoAnswer(ExitStatus::Failed, why, "Check that --server names a CIM-XML server.");
+}
+
+/// A server that confuses objects must not have the state of one taken for that of another. References are
+/// left out: one object has many spellings.
+void requireSameKeys(const core::InstanceValue& instance, const core::CimPath& path) {
+    for (const core::CimKey& key : path.getKeys()) {
+        const core::PropertyValue* property = instance.find(key.name);
+        const core::CimScalar* value = property == nullptr ? nullptr : property->value.scalar();
+        if (value == nullptr || std::holds_alternative<core::CimPath>(*value)) continue;
+        if (core::scalarText(*value) != core::scalarText(key.value))
+            refuseAnswer("The server's answer is about another object than " + path.toString() + ".");
+    }
 }
 
 /// The most that a list in pieces may hold, and what a piece counts at least: a server could go on for ever
 /// with empty ones.
 constexpr std::size_t kLargestList = std::size_t{256} << 20;
 constexpr std::size_t kLeastPiece = std::size_t{256} << 10;
+
+/// A small element may become a large value.
+std::size_t bytesOf(const IntrinsicResult& result) {
+    std::size_t bytes = 0;
+    for (const core::InstanceValue& instance : result.instances)
+        bytes += core::bytesOf(instance);
+    for (const core::CimPath& path : result.paths)
+        bytes += core::bytesOf(path);
+    return bytes;
+}
 
 /// An operation whose answer may be large: whole, and its form in pieces (DSP0200 5.4.2.24).
 struct Listing {
@@ -162,7 +157,7 @@ class RemoteOperations : public core::CimOperations {
     core::MethodResult invokeMethod(const core::CimPath& path, const std::string& method,
                                     const std::vector<core::Argument>& arguments) override;
     void deleteInstance(const core::CimPath& path) override {
-        call("DeleteInstance", {{"InstanceName", path}});
+        call("DeleteInstance", {{"InstanceName", path}}, Sending::Once);
     }
     core::ClassChain getClass(const std::string& className) override;
     std::vector<core::ClassChain> enumerateClasses(const std::string& className, bool deep) override;
@@ -171,7 +166,8 @@ class RemoteOperations : public core::CimOperations {
     /// Inherited properties, too: servers leave them out by default (DSP0200 5.4.2.3).
     static inline const cimxml::Parameter kWhole{"LocalOnly", std::string("FALSE")};
 
-    IntrinsicResult call(const std::string& operation, Parameters parameters);
+    IntrinsicResult call(const std::string& operation, Parameters parameters,
+                         Sending sending = Sending::AsOftenAsNeeded);
     /// The whole list, read in pieces where the server can.
     IntrinsicResult list(const Listing& listing, const Parameters& parameters);
     IntrinsicResult pullAll(const Listing& listing, Parameters parameters);
@@ -179,7 +175,7 @@ class RemoteOperations : public core::CimOperations {
     /// Some operations answer with host and namespace, some with neither: all paths read as those in process.
     void complete(core::CimPath& path) const;
     /// Sends the call; a CIM error in the answer is thrown as core::CimError.
-    cimxml::Response send(cimxml::Request request, const std::string& object);
+    cimxml::Response send(cimxml::Request request, const std::string& object, Sending sending);
 
     HttpClient m_client;
     std::string m_namespace;
@@ -189,7 +185,7 @@ class RemoteOperations : public core::CimOperations {
     bool m_canPull = true;       ///< until the server says otherwise
 };
 
-cimxml::Response RemoteOperations::send(cimxml::Request request, const std::string& object) {
+cimxml::Response RemoteOperations::send(cimxml::Request request, const std::string& object, Sending sending) {
     // Tells to which request an answer belongs (DSP0201).
     request.messageId = std::to_string(++m_messages);
     // Without the empty "Expect:", a large body waits a second for servers that do not answer it.
@@ -197,7 +193,7 @@ cimxml::Response RemoteOperations::send(cimxml::Request request, const std::stri
         {"Content-Type: application/xml; charset=\"utf-8\"", "Expect:", "CIMProtocolVersion: 1.0",
          "CIMOperation: MethodCall", "CIMMethod: " + percentEncoded(request.name()),
          "CIMObject: " + percentEncoded(object)},
-        cimxml::writeRequest(request));
+        cimxml::writeRequest(request), sending);
     requireOk(reply);
     m_received += std::max(reply.body.size(), kLeastPiece);
     try {
@@ -212,10 +208,10 @@ cimxml::Response RemoteOperations::send(cimxml::Request request, const std::stri
     }
 }
 
-IntrinsicResult RemoteOperations::call(const std::string& operation, Parameters parameters) {
+IntrinsicResult RemoteOperations::call(const std::string& operation, Parameters parameters, Sending sending) {
     cimxml::Request request;
     request.call = cimxml::IntrinsicCall{operation, m_namespace, std::move(parameters)};
-    cimxml::Response response = send(std::move(request), m_namespace);
+    cimxml::Response response = send(std::move(request), m_namespace, sending);
     auto* result = std::get_if<IntrinsicResult>(&response.content);
     if (result == nullptr) refuseAnswer("The server's answer is not that of an operation.");
     for (core::InstanceValue& instance : result->instances)
@@ -252,11 +248,14 @@ IntrinsicResult RemoteOperations::pullAll(const Listing& listing, Parameters par
     m_received = 0;
     IntrinsicResult all = call(listing.open, std::move(parameters));
     IntrinsicResult part{.outputs = all.outputs};
+    std::size_t built = bytesOf(all);
     while (!core::sameName(outputOf(part, "EndOfSequence"), "TRUE")) {
         const std::string context = outputOf(part, "EnumerationContext");
         if (context.empty()) refuseAnswer("The server's answer has neither an end nor a way to go on.");
-        if (m_received > kLargestList) refuseLargeAnswer(m_url, kLargestList);
-        part = call(listing.pull, {{"EnumerationContext", context}, count});
+        if (std::max(m_received, built) > kLargestList) refuseLargeAnswer(m_url, kLargestList);
+        // A piece that was sent and lost would be missing from the list without a word.
+        part = call(listing.pull, {{"EnumerationContext", context}, count}, Sending::Once);
+        built += bytesOf(part);
         std::move(part.instances.begin(), part.instances.end(), std::back_inserter(all.instances));
         std::move(part.paths.begin(), part.paths.end(), std::back_inserter(all.paths));
     }
@@ -273,6 +272,7 @@ core::InstanceValue RemoteOperations::getInstance(const core::CimPath& path,
                                                   const core::PropertyFilter& filter) {
     auto instances = call("GetInstance", withFilter({{"InstanceName", path}, kWhole}, filter)).instances;
     if (instances.empty()) throw core::CimError(core::CimStatus::NotFound, path.toString());
+    requireSameKeys(instances.front(), path);
     // The answer does not repeat the path.
     instances.front().path = path;
     return std::move(instances.front());
@@ -284,7 +284,7 @@ core::MethodResult RemoteOperations::invokeMethod(const core::CimPath& path, con
     object.completeNamespace(m_namespace);
     cimxml::Request request;
     request.call = cimxml::MethodCall{method, object, arguments};
-    cimxml::Response response = send(std::move(request), object.toString());
+    cimxml::Response response = send(std::move(request), object.toString(), Sending::Once);
     auto* result = std::get_if<core::MethodResult>(&response.content);
     if (result == nullptr) refuseAnswer("The server's answer is not that of a method.");
     return std::move(*result);

@@ -32,19 +32,22 @@ void printJson(std::ostream& out, const Json& document) {
 }
 
 void printTable(std::ostream& out, const std::vector<std::vector<std::string>>& rows) {
+    // A longer cell does not widen its column: it would take as many spaces in each of the other rows.
+    constexpr std::size_t kWidest = 200;
     // Measured as printed: a control character takes four columns.
     std::vector<std::size_t> widths;
     for (const auto& row : rows) {
         widths.resize(std::max(widths.size(), row.size()));
         for (std::size_t i = 0; i < row.size(); ++i)
-            widths[i] = std::max(widths[i], columnsOf(printable(row[i])));
+            widths[i] = std::max(widths[i], std::min(columnsOf(printable(row[i])), kWidest));
     }
     for (const auto& row : rows) {
         for (std::size_t i = 0; i < row.size(); ++i) {
             const std::string cell = printable(row[i]);
             out << cell;
             // Nothing follows the last cell, so no spaces either.
-            if (i + 1 < row.size()) out << std::string(widths[i] + 2 - columnsOf(cell), ' ');
+            if (i + 1 < row.size())
+                out << std::string(widths[i] + 2 - std::min(columnsOf(cell), widths[i]), ' ');
         }
         out << '\n';
     }
@@ -75,9 +78,10 @@ void adl_serializer<core::CimValue>::to_json(cli::Json& json, const core::CimVal
 }
 
 void adl_serializer<core::InstanceValue>::to_json(cli::Json& json, const core::InstanceValue& instance) {
-    cli::Json properties = cli::Json::object();
+    // Appended, not assigned: to look each name up would take quadratic time, and no two are the same.
+    cli::Json::object_t properties;
     for (const core::PropertyValue& property : instance.properties)
-        properties[property.name] = property.value;
+        properties.emplace_back(property.name, property.value);
     json = {{"path", instance.path},
             {"class", instance.path.getClassName()},
             {"properties", std::move(properties)}};

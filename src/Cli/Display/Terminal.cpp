@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Cli/Display/Terminal.h"
 
+#include <poll.h>
 #include <sys/ioctl.h>
 #include <unistd.h>
 
@@ -21,15 +22,18 @@ bool isSet(const char* variable) {
     return value != nullptr && *value != '\0';
 }
 
-/// Controls, U+0080 to U+009F among them, move the cursor and more; bidirectional overrides and isolates
-/// (U+202A to U+202E, U+2066 to U+2069) make a text look like another.
+/// Controls, U+0080 to U+009F among them, move the cursor and more. Marks, overrides and isolates of the
+/// direction (U+061C, U+200E, U+200F, U+202A to U+202E, U+2066 to U+2069), line separators (U+2028, U+2029)
+/// and what nobody sees (U+00AD, U+200B to U+200D, U+2060 to U+2065, U+FEFF) make a text look like another.
 bool drivesTerminal(std::string_view character) {
     const auto isWithin = [&](std::string_view lead, char first, char last) {
         return character.size() == lead.size() + 1 && character.starts_with(lead) &&
                character.back() >= first && character.back() <= last;
     };
     return utils::isControl(character.front()) || isWithin("\xC2", '\x80', '\x9F') ||
-           isWithin("\xE2\x80", '\xAA', '\xAE') || isWithin("\xE2\x81", '\xA6', '\xA9');
+           character == "\xC2\xAD" || character == "\xD8\x9C" || isWithin("\xE2\x80", '\x8B', '\x8F') ||
+           isWithin("\xE2\x80", '\xA8', '\xAE') || isWithin("\xE2\x81", '\xA0', '\xAF') ||
+           character == "\xEF\xBB\xBF";
 }
 
 /// Whether the byte belongs to the character before it.
@@ -99,13 +103,21 @@ std::size_t LinePrinter::width() const {
     return m_terminal.width() - 1;
 }
 
+bool LinePrinter::wouldBlock() const {
+    pollfd place{m_terminal.descriptor, POLLOUT, 0};
+    // What poll() cannot tell is tried.
+    return m_terminal.descriptor >= 0 && ::poll(&place, 1, 0) == 0;
+}
+
 void LinePrinter::print(const std::string& line) {
+    if (wouldBlock()) return;
     // The line that stays takes the bottom line's place, which is written again below it.
     if (!m_bottom.empty()) m_out << kClearLine;
     m_out << line << '\n' << m_bottom << std::flush;
 }
 
 void LinePrinter::rewrite(const std::string& line) {
+    if (wouldBlock()) return;
     m_bottom = elideMiddle(line, width());
     m_out << kClearLine << m_bottom << std::flush;
 }
@@ -113,6 +125,7 @@ void LinePrinter::rewrite(const std::string& line) {
 void LinePrinter::keep() {
     if (m_bottom.empty()) return;
     m_bottom.clear();
+    if (wouldBlock()) return;
     m_out << '\n' << std::flush;
 }
 

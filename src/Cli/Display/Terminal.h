@@ -8,8 +8,9 @@
 
 namespace cli {
 
-/// The text with the bytes of control characters, of those that change the direction of writing, and of what
-/// is not UTF-8 written as \xNN: a text of a device, a file or a server must not drive the terminal.
+/// The text with the bytes of control characters, of those that change the direction of writing, break lines
+/// or cannot be seen, and of what is not UTF-8 written as \xNN: a text of a device, a file or a server must
+/// not drive the terminal.
 std::string printable(std::string_view text);
 
 /// The columns that a UTF-8 text takes, each character one; bytes that are not UTF-8 count as one each.
@@ -45,7 +46,8 @@ class LinePrinter {
     /// The columns that rewrite() has.
     std::size_t width() const;
 
-    /// A line that stays.
+    /// A line that stays. Like rewrite(), left out where nobody reads what was written before: an update must
+    /// not wait for that.
     void print(const std::string& line);
     /// The line at the bottom, in the place of the previous one, cut in the middle to the width. Only when
     /// canRewrite().
@@ -54,6 +56,8 @@ class LinePrinter {
     void keep();
 
   private:
+    bool wouldBlock() const;
+
     std::ostream& m_out;
     Terminal m_terminal;
     std::string m_bottom;

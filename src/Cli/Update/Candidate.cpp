@@ -6,6 +6,7 @@
 #include <algorithm>
 #include <cerrno>
 #include <filesystem>
+#include <iterator>
 #include <system_error>
 
 #include "Utils/Os/Linux/linux.h"
@@ -78,34 +79,44 @@ ImageFile readImage(const std::string& path) try {
     return {path, cannotRead(path, error.code().value()), {}};
 }
 
+/// The images that are written for these types: each whole, also when it carries a type besides.
 /// @param types  those asked for; none means all
+ma::RomFile chosenOf(const ma::RomFile& rom, const std::vector<std::string>& types) {
+    ma::RomFile chosen;
+    std::ranges::copy_if(rom.images, std::back_inserter(chosen.images), [&](const ma::RomImage& image) {
+        if (types.empty()) return image.type != utils::FirmwareType{};
+        return std::ranges::any_of(types, [&](const auto& type) { return carries(image, type); });
+    });
+    return chosen;
+}
+
+/// Another PXE image would take the one with the CLP entry point away, so the same version is not the same.
+bool losesClp(const Adapter& adapter, const std::vector<Component>& chosen) {
+    return versionOf(adapter.components, "IMG_CLP") && versionOf(chosen, "IMG_PXE") &&
+           !versionOf(chosen, "IMG_CLP");
+}
+
+/// @param types  as for chosenOf()
 Comparison compare(const ma::RomFile& rom, const Adapter& adapter, const std::vector<std::string>& types) {
     Comparison result;
-    for (const utils::FirmwareVersionInfo& component : rom.components()) {
-        const std::string type(ma::firmwareTypeName(component.type));
-        const bool isChosen = types.empty() || std::find(types.begin(), types.end(), type) != types.end();
-        if (!type.empty() && isChosen) result.chosen.push_back({type, component.version});
-    }
+    const ma::RomFile chosen = chosenOf(rom, types);
+    for (const utils::FirmwareVersionInfo& component : chosen.components())
+        result.chosen.push_back({std::string(ma::firmwareTypeName(component.type)), component.version});
     for (const std::string& type : types) {
         const bool isThere =
             std::ranges::any_of(rom.images, [&](const auto& image) { return carries(image, type); });
         // "IMG_PXE+" asks for an empty type besides, which the service ignores, too.
         if (!type.empty() && !isThere) result.missing.push_back(type);
     }
-    for (const ma::RomImage& image : rom.images) {
-        const bool isChosen = types.empty() || std::ranges::any_of(types, [&](const auto& type) {
-                                  return carries(image, type);
-                              });
-        // An image can carry two types, and is written whole for either.
-        if (isChosen) result.bytes += image.length;
-        result.isNetwork = result.isNetwork && image.isNetwork();
-    }
+    for (const ma::RomImage& image : chosen.images)
+        result.bytes += image.length;
+    result.isNetwork = std::ranges::all_of(rom.images, &ma::RomImage::isNetwork);
     // An adapter that does not show its ids can be compared with nothing; the service knows them.
     if (!adapter.ids.empty()) result.foreignIds = firstForeignIds(rom, adapter.ids);
-    result.current =
-        !result.chosen.empty() && std::ranges::all_of(result.chosen, [&](const Component& component) {
-            return versionOf(adapter.components, component.type) == component.version;
-        });
+    result.current = !result.chosen.empty() && !losesClp(adapter, result.chosen) &&
+                     std::ranges::all_of(result.chosen, [&](const Component& component) {
+                         return versionOf(adapter.components, component.type) == component.version;
+                     });
     return result;
 }
 

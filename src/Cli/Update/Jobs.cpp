@@ -3,6 +3,7 @@
 
 #include <algorithm>
 #include <array>
+#include <limits>
 #include <unordered_map>
 
 #include "Cli/Display/Messages.h"
@@ -45,16 +46,35 @@ void nameAdapters(core::CimOperations& operations, std::vector<JobView>& jobs) {
     }
 }
 
+/// The number as the type holds it. One that is too large becomes the largest, which means nothing, and not
+/// some other number, which may.
+template <class Held>
+Held numberOf(const core::InstanceValue& job, std::string_view name) {
+    return static_cast<Held>(std::min<std::uint64_t>(job.number(name), std::numeric_limits<Held>::max()));
+}
+
 JobView viewOf(const core::InstanceValue& job) {
     return {job.path,
             job.text("InstanceID"),
             "",
             job.get<utils::Time>("StartTime"),
             job.text("Owner"),
-            static_cast<std::uint16_t>(job.number("JobState")),
-            static_cast<unsigned>(job.number("PercentComplete")),
-            static_cast<std::uint16_t>(job.number("ErrorCode")),
+            numberOf<std::uint16_t>(job, "JobState"),
+            numberOf<unsigned>(job, "PercentComplete"),
+            numberOf<std::uint16_t>(job, "ErrorCode"),
             job.text("ErrorDescription")};
+}
+
+CommandError jobIsGone() {
+    return {ExitStatus::Unknown,
+            "The server no longer knows the job: it was deleted, or the server was restarted. How the update "
+            "ends cannot be seen here.",
+            "\"quenxctl adapters\" shows which firmware is there."};
+}
+
+/// A server that was restarted counts its jobs from 1 again, so the id alone may be that of somebody else's.
+bool isAnotherJob(const JobView& before, const JobView& now) {
+    return before.start && now.start && core::datetimeText(*before.start) != core::datetimeText(*now.start);
 }
 
 JobView lookAt(core::CimOperations& operations, const core::CimPath& job, const Following& following) {
@@ -64,18 +84,15 @@ JobView lookAt(core::CimOperations& operations, const core::CimPath& job, const 
     for (unsigned failures = 0; failures < kMaxFailures; ++failures) {
         if (failures > 0) following.pause();
         try {
-            return viewOf(operations.getInstance(job));
+            const core::InstanceValue instance = operations.getInstance(job);
+            const auto state = instance.get<std::uint64_t>("JobState");
+            if (state && *state <= std::numeric_limits<std::uint16_t>::max()) return viewOf(instance);
+            reason = "The job has no state that can be read.";
         } catch (const CommandError& error) {
             if (error.status() == ExitStatus::Interrupted) throw;
             reason = error.what();
         } catch (const core::CimError& error) {
-            if (error.status() == core::CimStatus::NotFound) {
-                throw CommandError(
-                    ExitStatus::Unknown,
-                    "The server no longer knows the job: it was deleted, or the server was restarted. "
-                    "How the update ends cannot be seen here.",
-                    "\"quenxctl adapters\" shows which firmware is there.");
-            }
+            if (error.status() == core::CimStatus::NotFound) throw jobIsGone();
             reason = std::string("The job cannot be read: ") + error.what() + ".";
         }
     }
@@ -135,7 +152,9 @@ void followJob(core::CimOperations& operations, JobView& job, ProgressDisplay& p
                const Following& following) {
     unsigned shown = 0;
     while (true) {
-        job = lookAt(operations, core::CimPath(job.path), following);
+        JobView seen = lookAt(operations, core::CimPath(job.path), following);
+        if (isAnotherJob(job, seen)) throw jobIsGone();
+        job = std::move(seen);
         if (const auto percent = job.certainPercent()) {
             // Progress that goes back, as after a retry on the device, would only puzzle.
             shown = std::max(shown, *percent);

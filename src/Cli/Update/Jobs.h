@@ -49,6 +49,8 @@ struct Following {
     std::function<bool()> interrupted;  ///< whether the user asked to stop since the last time
     /// If the update would end with this program, an interruption does not end the following.
     bool untilTheEnd = true;
+    /// The update has ended, or none began: from here on an interruption may end the program.
+    std::function<void()> over = [] {};
 };
 
 /// Looks at the job until it has ended and shows its progress.

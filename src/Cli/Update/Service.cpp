@@ -10,6 +10,7 @@
 #include "Framework/Requests/Audit.h"
 #include "Providers/Schema/ProviderInterfaces.h"
 #include "Providers/Schema/ValueMaps.h"
+#include "Utils/Utils.h"
 
 namespace cli {
 
@@ -26,6 +27,8 @@ core::CimPath findService(core::CimOperations& operations) try {
     // No update was asked for yet, so this must not read as one that may have begun.
     throw CommandError(error.status(), error.what(), error.advice());
 }
+
+constexpr const char* kAskLog = "The system log may have the details.";
 
 /// What the methods take as InstallOptions and InstallOptionsValues. The values are parallel to the codes,
 /// value i belonging to code i: the one code that has a value comes first.
@@ -78,6 +81,12 @@ struct ServiceCall {
     } catch (const core::CimError& error) {
         audit(connection, core::outcomeOf(error.status(), error.what()));
         throw;
+    } catch (const CommandError&) {
+        throw;
+    } catch (const std::exception& error) {
+        // Memory may end after the service was called, and before its answer is read.
+        throw NoAnswer(ExitStatus::Failed,
+                       std::string("The service's answer was lost: ") + error.what() + ".", kAskLog);
     }
 };
 
@@ -103,11 +112,20 @@ core::MethodResult startUpdate(const Connection& connection, const Candidate& ca
     return call.run(connection);
 }
 
-core::CimPath jobOf(const core::MethodResult& result) {
+core::CimPath jobOf(const core::CimOperations& operations, const core::MethodResult& result) {
     // A server may give further outputs, and references among them.
     const core::Argument* job = core::findByName(result.outputs, "Job");
     const auto* path = job == nullptr ? nullptr : job->value.get<core::CimPath>();
-    if (path != nullptr) return *path;
+    if (path != nullptr) {
+        const std::string& place = path->getNamespace();
+        // In this namespace the same path may be another job.
+        if (place.empty() || core::sameName(place, utils::trimOf(operations.getNamespace(), "/")))
+            return *path;
+        throw CommandError(
+            ExitStatus::Unknown,
+            "The service started an update, but its job is in another namespace, " + place + ".",
+            "\"quenxctl jobs\" lists it with that --namespace.");
+    }
     throw CommandError(ExitStatus::Unknown, "The service started an update but did not name its job.",
                        "\"quenxctl jobs\" lists the jobs of a server.");
 }

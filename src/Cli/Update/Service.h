@@ -19,8 +19,8 @@ namespace cli {
 core::MethodResult startUpdate(const Connection& connection, const Candidate& candidate);
 
 /// The job among the outputs of startUpdate(). Throws CommandError with ExitStatus::Unknown when there is
-/// none.
-core::CimPath jobOf(const core::MethodResult& result);
+/// none, or one that these operations cannot look at.
+core::CimPath jobOf(const core::CimOperations& operations, const core::MethodResult& result);
 
 /// Has the service verify the image as startUpdate() does, without installing it. Returns what the method
 /// would, 0 for an image that could be installed. Nothing for a file on a server, whose service has no method

@@ -121,9 +121,7 @@ void judgeCompleted(Outcome& outcome, const Candidate& candidate) {
 std::vector<Component> readBack(core::CimOperations& operations, const Candidate& candidate) {
     try {
         return readComponents(operations, candidate.adapter.path);
-    } catch (const CommandError&) {
-        return {};
-    } catch (const core::CimError&) {
+    } catch (const std::exception&) {
         return {};
     }
 }
@@ -159,6 +157,33 @@ void followUpdate(Context& context, const core::CimPath& job, const Candidate& c
     }
 }
 
+/// Once the service was called and has returned this.
+ExitStatus conclude(Context& context, const core::MethodResult& result, const Candidate& candidate,
+                    Outcome& outcome) try {
+    outcome.returnValue = result.returnValue;
+    if (result.returnValue == MethodReturn::JobStarted) {
+        followUpdate(context, jobOf(*context.connection.operations, result), candidate, outcome);
+    } else if (result.returnValue == MethodReturn::Completed) {
+        // Other services may be done by the time they answer, and then name no job.
+        outcome.after = readBack(*context.connection.operations, candidate);
+        judgeCompleted(outcome, candidate);
+    } else {
+        outcome.end("refused", explainRefusal(context.connection, result.returnValue, candidate));
+    }
+    // An update in this program may still run when nobody knows how it ends.
+    if (outcome.result != "unknown") context.following.over();
+    return print(context, outcome);
+} catch (const CommandError&) {
+    throw;
+} catch (const core::CimError&) {
+    throw;
+} catch (const std::exception& error) {
+    // Memory may end at any time, and a script must not take that for an update that was refused.
+    throw CommandError(ExitStatus::Unknown,
+                       "Cannot tell how the update of " + outcome.adapter + " ends: " + error.what() + ".",
+                       "\"quenxctl adapters\" shows which firmware is there. Look before you install again.");
+}
+
 /// Nothing where the service was called and did not answer; the outcome then says so.
 std::optional<core::MethodResult> start(Context& context, const Candidate& candidate, Outcome& outcome) {
     try {
@@ -182,23 +207,13 @@ ExitStatus installUnlessInterrupted(Context& context, const UpdateOptions& optio
     if (!candidate.force && candidate.isAlreadyCurrent()) {
         endAsCurrent(outcome, candidate);
         outcome.advice = "Use --force to write it again.";
+        context.following.over();
         return print(context, outcome);
     }
     // The last moment to stop: once the service is called, nobody can.
     if (context.following.interrupted()) throw CommandError(ExitStatus::Interrupted, "Interrupted.", "");
     const std::optional<core::MethodResult> result = start(context, candidate, outcome);
-    if (!result) return print(context, outcome);
-    outcome.returnValue = result->returnValue;
-    if (result->returnValue == MethodReturn::JobStarted) {
-        followUpdate(context, jobOf(*result), candidate, outcome);
-    } else if (result->returnValue == MethodReturn::Completed) {
-        // Other services may be done by the time they answer, and then name no job.
-        outcome.after = readBack(*context.connection.operations, candidate);
-        judgeCompleted(outcome, candidate);
-    } else {
-        outcome.end("refused", explainRefusal(context.connection, result->returnValue, candidate));
-    }
-    return print(context, outcome);
+    return result ? conclude(context, *result, candidate, outcome) : print(context, outcome);
 }
 
 }  // namespace

@@ -56,6 +56,13 @@ bool isMeant(const JobView& job, const std::string& name) {
     return job.id == name || job.path.toString() == name || job.id.ends_with("@Job#" + name);
 }
 
+void deleteOnServer(core::CimOperations& operations, const core::CimPath& job) try {
+    operations.deleteInstance(job);
+} catch (const NoAnswer& error) {
+    throw CommandError(ExitStatus::Unknown, error.what() + std::string(" The job may have been deleted."),
+                       "\"quenxctl jobs\" shows whether it is still there.");
+}
+
 void printDeleted(Context& context, const JobView& job) {
     if (context.json) {
         printJson(context.out, {{"deleted", job.id}, {"updateGoesOn", !job.hasEnded()}});
@@ -88,7 +95,7 @@ ExitStatus deleteJob(Context& context, const VerbOptions& options) {
     for (const JobView& job : listJobs(operations)) {
         if (!isMeant(job, options.job)) continue;
         // As it was before: afterwards nobody can ask whether it still ran.
-        operations.deleteInstance(job.path);
+        deleteOnServer(operations, job.path);
         printDeleted(context, job);
         return ExitStatus::Done;
     }

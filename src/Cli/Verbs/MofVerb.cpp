@@ -11,8 +11,11 @@ namespace cli {
 namespace {
 
 std::string literal(const core::CimScalar& value) {
-    const auto* text = std::get_if<std::string>(&value);
-    return text != nullptr ? utils::quoted(*text) : core::foldName(core::scalarText(value));
+    const std::string text = core::scalarText(value);
+    // Whatever may hold a text of the server's stands in quotes.
+    const bool isWord =
+        !std::holds_alternative<std::string>(value) && !std::holds_alternative<core::CimPath>(value);
+    return isWord ? core::foldName(text) : utils::quoted(text);
 }
 
 std::string literal(const core::CimValue& value) {
