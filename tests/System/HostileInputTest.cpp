@@ -167,6 +167,7 @@ TEST_F(HostileInputTest, RefusesARequestByItsFault) {
     const std::string type = "application/xml";
     const std::string length = "Content-Length: " + std::to_string(m_body.size());
     const std::string call = "CIMOperation: MethodCall";
+    const std::string host = "Host: 127.0.0.1";
     const std::tuple<std::string, std::string, int, const char*> table[] = {
         {"</CIM>", "</CIX>", 400, "CIMError: request-not-well-formed"},
         {"Authorization: Basic ", "X: ", 401, "WWW-Authenticate: Basic realm="},
@@ -182,6 +183,15 @@ TEST_F(HostileInputTest, RefusesARequestByItsFault) {
         {length, length + "\r\n" + length, 200, ""},
         {length, length + "\r\nContent-Length: 5", 400, ""},
         {length, "Content-Length: 5\r\n" + length, 400, ""},
+        {length, length + "\r\nTransfer-Encoding : chunked", 400, ""},
+        {length, length + "\r\nHost: 127.0.0.1", 400, ""},
+        {length, length + "\r\nAuthorization: Basic eDp5", 400, ""},
+        {host, "Host: [::1%25lo]:5988", 200, ""},
+        {host, "Host: a.example:", 200, ""},
+        {host, "Host: \"\"", 400, ""},
+        {host, "Host: [::1", 400, ""},
+        {host, "Host: a:b", 400, ""},
+        {host, "Host: " + std::string(256, 'a'), 400, ""},
         {length, length + "\r\nContent-Encoding: gzip", 415, ""},
         {length, length + "\r\nContent-Encoding: identity", 200, ""},
         {call, "CIMOperation: methodcall\r\nCIMMethod: Enumerate%49nstanceNames", 200, ""},

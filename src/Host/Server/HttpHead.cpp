@@ -23,6 +23,26 @@ bool isXml(std::string_view contentType) {
     return name == "utf-8" || name == "us-ascii";
 }
 
+/// Whether the header can be taken for a name and port (RFC 9112 3.2): it goes into each path of an answer,
+/// where an odd or a long one would be repeated a thousand times.
+bool isHostAndPort(std::string_view host) {
+    constexpr std::size_t kLongestName = 255;
+    const std::size_t end = host.starts_with('[') ? host.find(']') : host.find(':');
+    const std::string_view name = host.substr(0, end);
+    const std::string_view rest = end == std::string_view::npos ? "" : host.substr(end);
+    const std::string_view port = rest.substr(rest.starts_with(']') ? 1 : 0);
+    const auto isOf = [](std::string_view text, std::string_view marks) {
+        return std::all_of(text.begin(), text.end(), [&](char c) {
+            return utils::isLetter(c) || utils::isDigit(c) || marks.find(c) != std::string_view::npos;
+        });
+    };
+    const bool isNumber = std::all_of(port.begin() + (port.empty() ? 0 : 1), port.end(), utils::isDigit);
+    const bool isName =
+        name.starts_with('[') ? rest.starts_with(']') && isOf(name.substr(1), ":.%-_~") : isOf(name, ".-_~%");
+    return isName && name.size() <= kLongestName && isNumber && port.size() <= sizeof ":65535" - 1 &&
+           (port.empty() || port.front() == ':');
+}
+
 }  // namespace
 
 HttpAnswer HttpAnswer::refusal(const cimxml::WireError& error) {
@@ -41,6 +61,7 @@ std::optional<std::uint64_t> contentLengthOf(const HttpHead& head) {
 
 std::optional<HttpAnswer> checkHead(const HttpHead& head, std::size_t bodyLimit) {
     // Cheap checks first, and all of them before the password: they take no memory and tell nothing secret.
+    if (head.isAmbiguous || !isHostAndPort(head.host)) return HttpAnswer::plain(400);
     if (head.method == "M-POST") return HttpAnswer::plain(501);
     if (head.method != "POST") return HttpAnswer::withHeader(405, "Allow", "POST");
     // No client of this protocol sends chunks, and with a length the refusal comes before the body.

@@ -6,6 +6,7 @@
 
 #include <algorithm>
 #include <array>
+#include <set>
 
 #include "CimXml/Response.h"
 #include "Framework/Requests/Audit.h"
@@ -16,6 +17,7 @@
 #include "Host/Server/HttpServer.h"
 #include "Host/Server/LocalSocket.h"
 #include "Utils/Log.h"
+#include "Utils/Utils.h"
 
 namespace host {
 
@@ -23,10 +25,23 @@ namespace {
 
 constexpr const char* kRealm = "Basic realm=\"Quenx management\", charset=\"UTF-8\"";
 
-/// Adds the header to the lengths, if it is one.
-MHD_Result addContentLength(void* lengths, MHD_ValueKind, const char* name, const char* value) {
-    if (core::sameName(name, "Content-Length"))
-        static_cast<std::vector<std::string>*>(lengths)->emplace_back(value == nullptr ? "" : value);
+/// What only shows when all headers are looked at.
+struct HeaderSurvey {
+    HttpHead& head;
+    std::set<std::string> names;
+};
+
+MHD_Result lookAtHeader(void* to, MHD_ValueKind, const char* text, const char* value) {
+    // Those that decide for whom, by whom and what is asked; others may come in several parts.
+    constexpr std::array kSingle = {"host",         "authorization", "content-type", "content-encoding",
+                                    "cimoperation", "cimmethod",     "cimobject"};
+    auto& survey = *static_cast<HeaderSurvey*>(to);
+    const std::string name = utils::lowerCase(text);
+    // "Content-Length : 5" is a length to some readers and to others none (RFC 9112 5.1).
+    if (name.find_first_of(" \t") != std::string::npos) survey.head.isAmbiguous = true;
+    if (name == "content-length") survey.head.contentLengths.emplace_back(value == nullptr ? "" : value);
+    if (std::find(kSingle.begin(), kSingle.end(), name) != kSingle.end() && !survey.names.insert(name).second)
+        survey.head.isAmbiguous = true;
     return MHD_YES;
 }
 
@@ -45,7 +60,8 @@ HttpHead readHead(MHD_Connection* connection, const char* method) {
     head.isChunked = header("Transfer-Encoding").has_value();
     head.cim = {header("CIMOperation"), header("CIMMethod"), header("CIMObject"),
                 header("CIMProtocolVersion"), header("CIMBatch").has_value()};
-    ::MHD_get_connection_values(connection, MHD_HEADER_KIND, &addContentLength, &head.contentLengths);
+    HeaderSurvey survey{head, {}};
+    ::MHD_get_connection_values(connection, MHD_HEADER_KIND, &lookAtHeader, &survey);
     return head;
 }
 

@@ -20,12 +20,13 @@ namespace host {
 struct HttpHead {
     std::string method;
     std::string address;  ///< the client's
-    std::string host;     ///< header Host
+    std::string host;     ///< header Host; empty where there is none
     std::optional<std::string> authorization;
     std::optional<std::string> contentType;
     std::optional<std::string> contentEncoding;
     std::vector<std::string> contentLengths;  ///< more than one where the client repeats the header
     bool isChunked = false;
+    bool isAmbiguous = false;  ///< has a name that is none, or two headers of which only one can count
     cimxml::RequestHeaders cim;
 };
 
