@@ -2,6 +2,7 @@
 #pragma once
 
 #include <array>
+#include <functional>
 #include <map>
 #include <memory>
 #include <string>
@@ -84,7 +85,8 @@ Response readResponse(std::string_view bytes);
 
 /// The response message, in the forms that the common clients read. Thread-safe, no state. The second lets go
 /// of each object once it is written, so that values and text are never both whole.
+/// @param grows  told after each object what the text takes; what it throws ends the writing
 std::string writeResponse(const Response& response);
-std::string writeResponse(Response&& response);
+std::string writeResponse(Response&& response, const std::function<void(std::size_t)>& grows = {});
 
 }  // namespace cimxml

@@ -87,6 +87,7 @@ struct ResultWriter {
 struct ContentWriter {
     XmlWriter& writer;
     const Response& response;
+    const std::function<void()>& wrote;
 
     void operator()(const ErrorResult& error) const {
         writer.start("ERROR").attribute("CODE", std::to_string(static_cast<int>(error.status)));
@@ -125,6 +126,7 @@ struct ContentWriter {
                 const auto taken = std::move(object);
                 ResultWriter{writer, result, response.host}.write(taken);
             }
+            wrote();
         }
     }
 
@@ -137,13 +139,16 @@ struct ContentWriter {
 };
 
 template <class AnyResponse>
-std::string write(AnyResponse& response) {
+std::string write(AnyResponse& response, const std::function<void(std::size_t)>& grows) {
     std::string out;
     XmlWriter writer(out);
+    const std::function<void()> wrote = [&] {
+        if (grows) grows(out.capacity());
+    };
     const std::string_view element = response.isMethod ? "METHODRESPONSE" : "IMETHODRESPONSE";
     startEnvelope(writer, response.messageId, "SIMPLERSP");
     writer.start(element).attribute("NAME", response.name).content();
-    std::visit(ContentWriter{writer, response}, response.content);
+    std::visit(ContentWriter{writer, response, wrote}, response.content);
     writer.end(element);
     endEnvelope(writer, "SIMPLERSP");
     return out;
@@ -152,11 +157,11 @@ std::string write(AnyResponse& response) {
 }  // namespace
 
 std::string writeResponse(const Response& response) {
-    return write(response);
+    return write(response, {});
 }
 
-std::string writeResponse(Response&& response) {
-    return write(response);
+std::string writeResponse(Response&& response, const std::function<void(std::size_t)>& grows) {
+    return write(response, grows);
 }
 
 }  // namespace cimxml

@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+#include <malloc.h>
 #include <pthread.h>
 
 #include <csignal>
@@ -72,6 +73,15 @@ void stop(host::Daemon& daemon, const Signals& signals) {
     }
 }
 
+/// Each connection has a thread, and by default the C library keeps what was free for each of dozens of them:
+/// many times the budget of answers.
+void boundKeptMemory() {
+    constexpr int kArenas = 2;
+    constexpr int kMappedAlone = 256 << 10;  // bytes, which go back to the system as soon as they are free
+    ::mallopt(M_ARENA_MAX, kArenas);
+    ::mallopt(M_MMAP_THRESHOLD, kMappedAlone);
+}
+
 int run(const host::Settings& settings) {
     // Before any thread starts, so that all of them inherit the mask.
     const Signals signals;
@@ -91,6 +101,7 @@ int run(const host::Settings& settings) {
 
 int main(int argc, char** argv) {
     os::openStandardDescriptors();
+    boundKeptMemory();
     const host::CommandLine command = host::readCommandLine(argc, argv);
     if (command.exitStatus) return *command.exitStatus;
     if (command.passwd) return host::runPasswd(*command.passwd);

@@ -35,6 +35,13 @@ TEST(AnswerBudgetTest, KeepsRoomForOthersAndForSmallAnswers) {
     EXPECT_THROW(AnswerCharge(budget, "a").add(2 * kMebibyte), OverBudget);
     moved.reset();
     AnswerCharge(budget, "a").add(3 * kMebibyte);
+    // What no other answer can hold is given in any case, and then others have to wait.
+    {
+        AnswerCharge owed(budget, "a");
+        owed.owe();
+        owed.cover(5 * kMebibyte);
+        EXPECT_THROW(other.add(1), OverBudget);
+    }
     EXPECT_THROW(AnswerCharge(budget, "a").add(3 * kMebibyte + 1), core::CimError);
 }
 

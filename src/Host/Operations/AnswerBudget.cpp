@@ -16,9 +16,9 @@ namespace {
 /// in multiples of it, so that the budget is asked once for many values.
 constexpr std::size_t kUncounted = std::size_t{64} << 10;
 
-/// From this size on the memory of an answer is handed back to the system. The C library would keep it, once
-/// for each of its arenas.
-constexpr std::size_t kTrimmed = std::size_t{16} << 20;
+/// Once answers have given back so much, so does the process: the C library would keep it, once for each of
+/// its arenas.
+constexpr std::size_t kTrimmed = std::size_t{32} << 20;
 
 std::size_t countedOf(std::size_t bytes) {
     return bytes <= kUncounted ? 0 : (bytes + kUncounted - 1) / kUncounted * kUncounted;
@@ -26,10 +26,10 @@ std::size_t countedOf(std::size_t bytes) {
 
 }  // namespace
 
-bool AnswerBudget::take(const std::string& user, std::size_t bytes) {
+bool AnswerBudget::take(const std::string& user, std::size_t bytes, bool isOwed) {
     const utils::Mutex::AutoLocker lock(m_mutex);
     std::size_t& own = m_byUser[user];
-    const bool fits = bytes <= m_bytes - m_taken && own + bytes <= share();
+    const bool fits = isOwed || (m_taken + bytes <= m_bytes && own + bytes <= share());
     if (fits) {
         own += bytes;
         m_taken += bytes;
@@ -40,11 +40,18 @@ bool AnswerBudget::take(const std::string& user, std::size_t bytes) {
 }
 
 void AnswerBudget::giveBack(const std::string& user, std::size_t bytes) noexcept {
-    const utils::Mutex::AutoLocker lock(m_mutex);
-    m_taken -= bytes;
-    const auto own = m_byUser.find(user);
-    own->second -= bytes;
-    if (own->second == 0) m_byUser.erase(own);
+    {
+        const utils::Mutex::AutoLocker lock(m_mutex);
+        m_taken -= bytes;
+        const auto own = m_byUser.find(user);
+        own->second -= bytes;
+        if (own->second == 0) m_byUser.erase(own);
+        m_givenBack += bytes;
+        if (m_givenBack < kTrimmed) return;
+        m_givenBack = 0;
+    }
+    // Takes milliseconds, during which nobody should have to wait for the budget.
+    ::malloc_trim(0);
 }
 
 AnswerCharge::AnswerCharge(AnswerCharge&& other) noexcept
@@ -52,7 +59,7 @@ AnswerCharge::AnswerCharge(AnswerCharge&& other) noexcept
       m_user(std::move(other.m_user)),
       m_bytes(std::exchange(other.m_bytes, 0)),
       m_reserved(std::exchange(other.m_reserved, 0)),
-      m_peak(std::exchange(other.m_peak, 0)) {}
+      m_isOwed(other.m_isOwed) {}
 
 AnswerCharge& AnswerCharge::operator=(AnswerCharge&& other) noexcept {
     // What was charged here goes with the other.
@@ -60,21 +67,19 @@ AnswerCharge& AnswerCharge::operator=(AnswerCharge&& other) noexcept {
     m_user.swap(other.m_user);
     std::swap(m_bytes, other.m_bytes);
     std::swap(m_reserved, other.m_reserved);
-    std::swap(m_peak, other.m_peak);
+    std::swap(m_isOwed, other.m_isOwed);
     return *this;
 }
 
 AnswerCharge::~AnswerCharge() {
     if (m_reserved != 0) m_budget->giveBack(m_user, m_reserved);
-    if (m_peak >= kTrimmed) ::malloc_trim(0);
 }
 
 bool AnswerCharge::reserve() {
     const std::size_t counted = countedOf(m_bytes);
-    if (counted > m_reserved && !m_budget->take(m_user, counted - m_reserved)) return false;
+    if (counted > m_reserved && !m_budget->take(m_user, counted - m_reserved, m_isOwed)) return false;
     if (counted < m_reserved) m_budget->giveBack(m_user, m_reserved - counted);
     m_reserved = counted;
-    m_peak = std::max(m_peak, m_reserved);
     return true;
 }
 
@@ -92,12 +97,15 @@ void AnswerCharge::set(std::size_t bytes) {
     if (!reserve()) throw OverBudget();
 }
 
+void AnswerCharge::cover(std::size_t bytes) {
+    if (bytes > m_bytes) set(bytes);
+}
+
 void AnswerCharge::moveTo(AnswerCharge& other, std::size_t bytes) {
     m_bytes -= std::min(m_bytes, bytes);
     other.m_bytes += bytes;
     const std::size_t kept = std::min(m_reserved, countedOf(m_bytes));
     other.m_reserved += m_reserved - kept;
-    other.m_peak = std::max(other.m_peak, other.m_reserved);
     m_reserved = kept;
 }
 

@@ -32,13 +32,14 @@ class AnswerBudget {
 
   private:
     friend class AnswerCharge;
-    bool take(const std::string& user, std::size_t bytes);
+    bool take(const std::string& user, std::size_t bytes, bool isOwed);
     void giveBack(const std::string& user, std::size_t bytes) noexcept;
 
     const std::size_t m_bytes;
     utils::Mutex m_mutex;
     std::size_t m_taken QUENX_GUARDED_BY(m_mutex) = 0;
     std::map<std::string, std::size_t> m_byUser QUENX_GUARDED_BY(m_mutex);
+    std::size_t m_givenBack QUENX_GUARDED_BY(m_mutex) = 0;  ///< since the system got memory back
 };
 
 /// What one answer takes of the budget, which must outlive it. Gives it back at its end, so what it counts
@@ -55,6 +56,10 @@ class AnswerCharge {
     void add(std::size_t bytes);
     /// What the answer takes now. Throws OverBudget.
     void set(std::size_t bytes);
+    /// The same, where it is more than what is charged already.
+    void cover(std::size_t bytes);
+    /// From now on the answer is given whatever it takes: it holds what no other answer can.
+    void owe() { m_isOwed = true; }
     /// So much of the answer is another answer of the same user from now on.
     void moveTo(AnswerCharge& other, std::size_t bytes);
     AnswerCharge split(std::size_t bytes);
@@ -66,7 +71,7 @@ class AnswerCharge {
     std::string m_user;
     std::size_t m_bytes = 0;
     std::size_t m_reserved = 0;
-    std::size_t m_peak = 0;
+    bool m_isOwed = false;
 };
 
 /// Charges what the requests of this thread build.

@@ -134,6 +134,8 @@ IntrinsicResult OpenEnumerations::open(const EnumerationOwner& owner, IntrinsicR
     AnswerCharge kept = charge.split(bytesOf(result));
     m_entries.emplace(context,
                       Entry{owner, std::move(kept), std::move(result), timeout, Clock::now() + timeout});
+    // Refused now, the client would never learn the name of what is open.
+    charge.owe();
     addOutputs(part, false, context);
     return part;
 }
@@ -145,6 +147,8 @@ IntrinsicResult OpenEnumerations::pull(const EnumerationOwner& owner, cimxml::Re
     if (found->second.rest.kind != kind) refuseContext();
     IntrinsicResult part = takeNext(found->second.rest, count);
     found->second.charge.moveTo(charge, bytesOf(part));
+    // Refused now, these objects would be in no answer: whoever asks again gets the next ones.
+    charge.owe();
     const bool ended = isEmpty(found->second.rest);
     addOutputs(part, ended, ended ? "" : context);
     if (ended) {

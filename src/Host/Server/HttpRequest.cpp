@@ -198,7 +198,8 @@ HttpAnswer HttpRequest::carryOut() {
         HttpAnswer answer{
             200,
             {{"Content-Type", "application/xml; charset=\"utf-8\""}, {"CIMOperation", "MethodResponse"}},
-            cimxml::writeResponse(m_server.m_dispatcher.dispatch(request, caller, charge))};
+            cimxml::writeResponse(m_server.m_dispatcher.dispatch(request, caller, charge),
+                                  [&](std::size_t bytes) { charge.cover(bytes); })};
         charge.set(answer.body.capacity());
         answer.charge.emplace(std::move(charge));
         return answer;
