@@ -3,6 +3,7 @@
 #include <gtest/gtest.h>
 
 #include <ctime>
+#include <thread>
 
 #include "Framework/Model/CimError.h"
 #include "Host/Authentication/ClientAddress.h"
@@ -34,7 +35,6 @@ TEST(AnswerBudgetTest, KeepsRoomForOthersAndForSmallAnswers) {
     large.reset();
     EXPECT_THROW(AnswerCharge(budget, "a").add(2 * kMebibyte), OverBudget);
     moved.reset();
-    AnswerCharge(budget, "a").add(3 * kMebibyte);
     // What no other answer can hold is given in any case, and then others have to wait.
     {
         AnswerCharge owed(budget, "a");
@@ -42,6 +42,7 @@ TEST(AnswerBudgetTest, KeepsRoomForOthersAndForSmallAnswers) {
         owed.cover(5 * kMebibyte);
         EXPECT_THROW(other.add(1), OverBudget);
     }
+    AnswerCharge(budget, "a").add(3 * kMebibyte);
     EXPECT_THROW(AnswerCharge(budget, "a").add(3 * kMebibyte + 1), core::CimError);
 }
 
@@ -64,12 +65,12 @@ class ConnectionRoomTest : public ::testing::Test {
             m_watch.closed(socketOf(i));
     }
     static int socketOf(std::size_t index) { return 1000000 + static_cast<int>(index); }
-    bool admit(const std::string& network, bool logsIn = false) {
+    bool admit(const std::string& network, const std::string& user = "") {
         const int socket = socketOf(m_admitted.size());
         if (!m_watch.admit(socket, network, {})) return false;
         m_watch.started(socket);
         m_admitted.emplace_back(network, m_watch.suspend(socket));
-        if (logsIn) m_watch.loggedIn(socket);
+        if (!user.empty()) m_watch.loggedIn(socket, user);
         return true;
     }
     /// Who had to go: each with its network and how many came before it.
@@ -85,7 +86,7 @@ class ConnectionRoomTest : public ::testing::Test {
 };
 
 TEST_F(ConnectionRoomTest, KeepsAQuarterForNetworksFromWhichSomebodyLoggedIn) {
-    EXPECT_TRUE(admit("K", true));
+    EXPECT_TRUE(admit("K", "k"));
     m_watch.closed(socketOf(0));
     for (const char* stranger : {"a", "b", "z", "z", "c", "d"})
         EXPECT_TRUE(admit(stranger));
@@ -102,19 +103,52 @@ TEST_F(ConnectionRoomTest, KeepsAQuarterForNetworksFromWhichSomebodyLoggedIn) {
 
 TEST_F(ConnectionRoomTest, IsNotMadeByThoseWhoLoggedIn) {
     for (const char* network : {"a", "b", "c", "d", "e", "f", "g"})
-        EXPECT_TRUE(admit(network, true));
+        EXPECT_TRUE(admit(network, network));
     EXPECT_TRUE(admit("a"));
-    EXPECT_FALSE(admit("x"));
-    EXPECT_EQ(ended(), "");
-    EXPECT_TRUE(admit("b", true)) << "known, as the one who goes";
-    EXPECT_EQ(ended(), "a7");
+    EXPECT_TRUE(admit("x")) << "the only stranger, for one who is known by the network alone";
+    EXPECT_TRUE(admit("b", "b")) << "for the stranger";
+    EXPECT_EQ(ended(), "a7x8");
     EXPECT_FALSE(admit("c"));
     for (unsigned int i = 0; i < host::ConnectionWatch::kLocalConnections; ++i)
-        EXPECT_TRUE(admit(host::kLocalAddress, true)) << "places of their own";
+        EXPECT_TRUE(admit(host::kLocalAddress, "root")) << "places of their own";
     EXPECT_FALSE(admit(host::kLocalAddress));
     m_watch.idle(socketOf(m_admitted.size() - 1), 60s);
     EXPECT_TRUE(admit(host::kLocalAddress));
-    EXPECT_EQ(ended(), "a7local24");
+    EXPECT_EQ(ended(), "a7x8local25");
+}
+
+TEST_F(ConnectionRoomTest, IsMadeByAUserWithMoreThanAQuarter) {
+    for (const char* network : {"a", "b", "c", "d", "e", "f", "g", "h"})
+        EXPECT_TRUE(admit(network, *network < 'd' ? "many" : network));
+    m_watch.idle(socketOf(1), 60s);
+    EXPECT_TRUE(admit("x", "x"));
+    EXPECT_EQ(ended(), "b1");
+    EXPECT_FALSE(admit("y")) << "two are a quarter";
+    // Whoever is refused, or may have been removed, has to log in again to be safe.
+    m_watch.loggedOut(socketOf(4));
+    EXPECT_TRUE(admit("y", "y"));
+    EXPECT_EQ(ended(), "b1e4");
+    m_watch.idle(socketOf(5), 60s);
+    m_watch.doubtLogins();
+    EXPECT_TRUE(admit("z"));
+    EXPECT_EQ(ended(), "b1e4f5");
+    m_watch.endIdle();
+    for (int i = 0; i < 600 && ended() == "b1e4f5"; ++i)
+        std::this_thread::sleep_for(100ms);
+    EXPECT_EQ(ended(), "b1e4f5z10") << "no stop waits for one who has not logged in";
+}
+
+TEST_F(ConnectionRoomTest, KnowsTheNetworksOfOthersHoweverManyOneUserHas) {
+    EXPECT_TRUE(admit("K", "k"));
+    m_watch.closed(socketOf(0));
+    for (int i = 0; i < 1100; ++i) {
+        EXPECT_TRUE(admit("n" + std::to_string(i), "many"));
+        m_watch.closed(socketOf(m_admitted.size() - 1));
+    }
+    for (const char* stranger : {"u", "v", "w", "x", "y", "z"})
+        EXPECT_TRUE(admit(stranger));
+    EXPECT_TRUE(admit("K") && admit("K"));
+    EXPECT_EQ(ended(), "") << "a quarter is kept for K";
 }
 
 TEST(WantedPropertiesTest, FindAsFastAmongThousandsOfNames) {

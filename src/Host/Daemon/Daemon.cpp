@@ -176,6 +176,7 @@ void Daemon::reload() {
     };
     // Each by itself: a certificate that cannot be read must not keep a removed user in.
     again("users", [this] { m_authentication->reload(); });
+    m_server->doubtLogins();
     if (m_settings.listen.https) again("certificate and key", [this] { readCertificate(); });
 }
 

@@ -3,12 +3,17 @@
 
 #include <sys/socket.h>
 
+#include <algorithm>
+
 namespace host {
 
 namespace {
 
 // Limits are whole seconds, so looking four times a second is exact enough and needs no queue of deadlines.
 constexpr std::chrono::milliseconds kTick{250};
+
+// A stop waits so long for clients of whom nobody knows yet that they may use the server.
+constexpr std::chrono::seconds kForStrangers{2};
 
 }  // namespace
 
@@ -50,6 +55,11 @@ void ConnectionWatch::set(int socket, Clock::time_point deadline, bool isIdle) {
     found->second.deadline = deadline;
     found->second.isIdle = isIdle;
     if (m_stopping && isIdle) end(socket, found->second);
+    if (m_stopping) hurry(found->second);
+}
+
+void ConnectionWatch::hurry(Watched& watched) const {
+    if (!watched.isLocal() && !watched.isLoggedIn()) watched.deadline = std::min(watched.deadline, m_last);
 }
 
 void ConnectionWatch::allow(int socket, Clock::duration allowed) {
@@ -71,8 +81,10 @@ void ConnectionWatch::endIdle() {
     const std::lock_guard lock(m_mutex);
     // Those at work end by themselves: their answers carry "Connection: close".
     m_stopping = true;
+    m_last = Clock::now() + kForStrangers;
     for (auto& [socket, watched] : m_watched) {
         if (watched.isIdle) end(socket, watched);
+        hurry(watched);
     }
 }
 

@@ -142,7 +142,7 @@ std::optional<HttpAnswer> HttpRequest::authenticate() {
         if (result.outcome != AuthenticationOutcome::Accepted) return answerOf(result.outcome);
         m_user = std::move(result.user);
     }
-    m_server.m_watch->loggedIn(m_socket);
+    m_server.m_watch->loggedIn(m_socket, m_user.name);
     return std::nullopt;
 }
 
@@ -157,6 +157,8 @@ MHD_Result HttpRequest::begin() {
     // If a client may not send its body, it is told before it sends a megabyte.
     m_refusal = checkHead(m_head, m_server.m_limits.bodyBytes);
     if (!m_refusal) m_refusal = authenticate();
+    // A user who has been removed must not keep his place by requests that are refused.
+    if (m_refusal) m_server.m_watch->loggedOut(m_socket);
     goOn();
     if (!m_refusal) {
         // If a client announces a large body and sends none, only this much memory is wasted.

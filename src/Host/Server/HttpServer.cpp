@@ -175,6 +175,10 @@ void HttpServer::listenLocally(const std::string& path) {
     });
 }
 
+void HttpServer::doubtLogins() {
+    m_watch->doubtLogins();
+}
+
 void HttpServer::stopAccepting() {
     m_stopping.store(true);
     m_localSocket.reset();

@@ -59,6 +59,9 @@ class HttpServer {
     /// What connections from now on are shown.
     void setCertificate(std::shared_ptr<const ServerCertificate> certificate);
 
+    /// Users may have been removed: has those who are idle log in again before they count as logged in.
+    void doubtLogins();
+
     /// Takes no more connections, ends those that are idle, and has the others end after their answer.
     void stopAccepting();
     /// The requests being carried out.
