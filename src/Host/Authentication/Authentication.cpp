@@ -74,9 +74,11 @@ AuthenticationResult Authentication::authenticate(const std::optional<std::strin
     if (!checked) return {AuthenticationOutcome::Busy, {}};
     const auto& user = checked->user;
     if (user && user->mayRead) return {AuthenticationOutcome::Accepted, *user};
-    core::audit({credentials->user, address, "login", "",
-                 user ? "denied: not admitted" : "denied: wrong user or password"});
-    if (user) return {AuthenticationOutcome::Forbidden, *user};
+    if (user) {
+        m_trail.refused({credentials->user, address, "login", "", "denied: not admitted"}, {});
+        return {AuthenticationOutcome::Forbidden, *user};
+    }
+    core::audit({credentials->user, address, "login", "", "denied: wrong user or password"});
     waitUntil(checked->mayBeTold, ended);
     return {AuthenticationOutcome::Wrong, {}};
 }

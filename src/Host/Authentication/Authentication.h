@@ -13,6 +13,7 @@
 
 #include "Host/Authentication/LoginQueue.h"
 #include "Host/Authentication/PasswordChecker.h"
+#include "Host/Operations/AuditTrail.h"
 
 namespace host {
 
@@ -122,6 +123,7 @@ class Authentication {
 
     std::unique_ptr<PasswordChecker> m_checker;
     CredentialCache m_cache;
+    AuditTrail m_trail;
     LoginQueue m_queue;
 };
 

@@ -47,21 +47,6 @@ std::string targetOf(const cimxml::IntrinsicCall& call) {
     return "";
 }
 
-void auditRequest(const cimxml::Request& request, const Caller& caller,
-                  const cimxml::Response& response) try {
-    core::AuditEvent event{caller.user, caller.address, request.name(), "",
-                           std::visit(OutcomeText{}, response.content)};
-    if (const auto* method = std::get_if<cimxml::MethodCall>(&request.call)) {
-        event.target = method->object.toString();
-        core::audit(event, method->arguments);
-    } else {
-        event.target = targetOf(std::get<cimxml::IntrinsicCall>(request.call));
-        core::audit(event);
-    }
-} catch (const std::bad_alloc&) {
-    // As in the rest of the log: a line that cannot be built is dropped.
-}
-
 }  // namespace
 
 Dispatcher::Dispatcher(Namespaces namespaces, const PullLimits& limits, std::size_t answerBytes)
@@ -98,11 +83,31 @@ core::MethodResult Dispatcher::callMethod(const cimxml::MethodCall& call, const 
     return target.invokeMethod(call.object, call.method, call.arguments);
 }
 
+void Dispatcher::audit(const cimxml::Request& request, const Caller& caller,
+                       const cimxml::Response& response) try {
+    core::AuditEvent event{caller.user, caller.address, request.name(), "",
+                           std::visit(OutcomeText{}, response.content)};
+    const auto* method = std::get_if<cimxml::MethodCall>(&request.call);
+    event.target = method != nullptr ? method->object.toString()
+                                     : targetOf(std::get<cimxml::IntrinsicCall>(request.call));
+    const std::vector<core::Argument> arguments =
+        method != nullptr ? method->arguments : std::vector<core::Argument>();
+    const auto* error = std::get_if<ErrorResult>(&response.content);
+    if (error != nullptr && error->status == CimStatus::AccessDenied) {
+        m_trail.refused(event, arguments);
+    } else {
+        m_trail.writeNumbers();
+        core::audit(event, arguments);
+    }
+} catch (const std::bad_alloc&) {
+    // As in the rest of the log: a line that cannot be built is dropped.
+}
+
 cimxml::Response Dispatcher::dispatch(const cimxml::Request& request, const Caller& caller,
                                       AnswerCharge& charge) {
     cimxml::Response response = carryOut(request, caller, charge);
     // However it ended: that somebody was refused is worth knowing, too.
-    if (isAudited(request)) auditRequest(request, caller, response);
+    if (isAudited(request)) audit(request, caller, response);
     return response;
 }
 

@@ -7,6 +7,7 @@
 
 #include "CimXml/Request.h"
 #include "CimXml/Response.h"
+#include "Host/Operations/AuditTrail.h"
 #include "Host/Operations/Operations.h"
 
 namespace host {
@@ -23,7 +24,8 @@ class Dispatcher {
     AnswerCharge charge(const std::string& user) { return {m_budget, user}; }
 
     /// Throws OverBudget, and nothing else for what a request asks or a provider does, memory exhaustion
-    /// included. Leaves an audit line for each call that changes something, or would if it were allowed.
+    /// included. Leaves an audit line for each call that changes something, or would if it were allowed,
+    /// but not for too many refusals of one user.
     /// @param charge  of the answer
     cimxml::Response dispatch(const cimxml::Request& request, const Caller& caller, AnswerCharge& charge);
 
@@ -36,10 +38,12 @@ class Dispatcher {
                                           AnswerCharge& charge);
     core::MethodResult callMethod(const cimxml::MethodCall& call, const Caller& caller);
     core::CimOperations& findNamespace(const std::string& name) const;
+    void audit(const cimxml::Request& request, const Caller& caller, const cimxml::Response& response);
 
     const Namespaces m_namespaces;
     AnswerBudget m_budget;
     OpenEnumerations m_enumerations;
+    AuditTrail m_trail;
     std::atomic<bool> m_shuttingDown{false};
 };
 

@@ -1,0 +1,61 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "Host/Operations/AuditTrail.h"
+
+#include <new>
+
+namespace host {
+
+namespace {
+
+constexpr unsigned int kListed = 20;
+constexpr std::chrono::minutes kCounted{1};
+constexpr std::size_t kLongestName = 65;  // of an operation: one more than a line shows
+
+}  // namespace
+
+AuditTrail::~AuditTrail() {
+    try {
+        writeNumbers(Clock::time_point::max());
+    } catch (const std::bad_alloc&) {
+        // As in the rest of the log: a line that cannot be built is dropped.
+    }
+}
+
+void AuditTrail::refused(const core::AuditEvent& event, const std::vector<core::Argument>& arguments,
+                         Clock::time_point now) {
+    writeNumbers(now);
+    unsigned int refusals = 0;
+    {
+        const utils::Mutex::AutoLocker lock(m_mutex);
+        Minute& minute = m_minutes[event.user];
+        if (minute.refusals == 0) minute.end = now + kCounted;
+        refusals = ++minute.refusals;
+        if (refusals > kListed)
+            minute.last = {event.user, event.address, event.operation.substr(0, kLongestName), "", ""};
+    }
+    if (refusals <= kListed) core::audit(event, arguments);
+}
+
+void AuditTrail::writeNumbers(Clock::time_point now) {
+    std::vector<core::AuditEvent> events;
+    {
+        const utils::Mutex::AutoLocker lock(m_mutex);
+        for (auto each = m_minutes.begin(); each != m_minutes.end();) {
+            Minute& minute = each->second;
+            if (minute.end > now) {
+                ++each;
+                continue;
+            }
+            if (minute.refusals > kListed) {
+                minute.last.outcome =
+                    "denied: " + std::to_string(minute.refusals - kListed) + " more within a minute";
+                events.push_back(std::move(minute.last));
+            }
+            each = m_minutes.erase(each);
+        }
+    }
+    for (const core::AuditEvent& event : events)
+        core::audit(event);
+}
+
+}  // namespace host
