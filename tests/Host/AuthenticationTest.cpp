@@ -11,6 +11,7 @@
 #include <algorithm>
 #include <atomic>
 #include <cerrno>
+#include <cstring>
 #include <ctime>
 #include <filesystem>
 #include <thread>
@@ -32,8 +33,8 @@ std::atomic<bool> isMemoryShort{false};
 extern "C" char* crypt_r(const char* phrase, const char* setting, crypt_data* data) noexcept {
     static const auto real = reinterpret_cast<decltype(&crypt_r)>(::dlsym(RTLD_NEXT, "crypt_r"));
     if (!isMemoryShort) return real(phrase, setting, data);
-    errno = ENOMEM;
-    return nullptr;
+    errno = EINVAL;  // as the method that passwd uses says it
+    return std::strcpy(data->output, "*0");
 }
 
 namespace {
@@ -71,6 +72,24 @@ TEST(UsersFileTest, ChecksPasswords) {
     const std::clock_t known = std::max(cost({"admin", "guest"}), cost({"admin", ""}));
     EXPECT_GT(cost({"nobody", odd}) * 10, known);
     EXPECT_GT(cost({"", ""}) * 10, known);
+    EXPECT_FALSE(users.check({"admin", std::string(600, 'x')}, "")) << "too long for any hash";
+}
+
+TEST(UsersFileTest, KeepsItsUsersWhereAReloadCannotBeMeant) {
+    const test::TempFolder folder;
+    const std::string hash = host::hashPassword("x");
+    const std::string file = folder.write("users", "\xC3\xBC:" + hash + ":admin\r\n");
+    ::chmod(file.c_str(), 0600);
+    host::UsersFile users(file);
+    for (const auto& [text, reason] :
+         {std::pair("\n", "it is empty"), std::pair("a:$x:admin\n", "hash of a.")}) {
+        folder.write("users", text);
+        EXPECT_THAT([&] { users.reload(); }, ThrowsMessage<std::runtime_error>(HasSubstr(reason)));
+        EXPECT_TRUE(users.check({"\xC3\xBC", "x"}, ""));
+    }
+    folder.write("users", "# the last user was deleted\n");
+    users.reload();
+    EXPECT_FALSE(users.check({"\xC3\xBC", "x"}, ""));
 }
 
 TEST(UsersFileTest, CallsNoPasswordWrongForWantOfMemory) {

@@ -15,6 +15,7 @@
 #include <stdexcept>
 
 #include "Host/Authentication/PasswordChecker.h"
+#include "Utils/Log.h"
 #include "Utils/Os/Linux/linux.h"
 #include "Utils/Utils.h"
 
@@ -41,8 +42,11 @@ std::string crypted(const std::string& password, const std::string& setting) {
     errno = 0;
     const char* hash = ::crypt_r(password.c_str(), setting.c_str(), data.get());
     const bool isFailure = hash == nullptr || *hash == '*';
-    // Some methods take megabytes. Without them the right password would be called wrong.
-    if (isFailure && errno == ENOMEM) throw CheckFailed("no memory to hash it");
+    // Some methods take megabytes, and say EINVAL as well as ENOMEM where there are none. The right password
+    // would be called wrong; only one that is too long is.
+    if (isFailure && errno != ERANGE)
+        throw CheckFailed(std::string("cannot hash it, most likely for want of memory: ") +
+                          std::strerror(errno));
     // A failure token begins with an asterisk and equals no hash.
     return isFailure ? "*" : hash;
 }
@@ -81,11 +85,31 @@ void checkMode(const std::string& path) {
     }
 }
 
+/// What cannot be meant, and would keep out who should come in.
+void requireUsable(const std::string& path, const UserEntries& users) {
+    for (const auto& [name, entry] : users) {
+        const int method = ::crypt_checksalt(entry.hash.c_str());
+        if (method == CRYPT_SALT_INVALID || method == CRYPT_SALT_METHOD_DISABLED)
+            fail(path, "this system cannot check the password hash of " + name +
+                           ". Set a password with: quenx-cimd passwd --users " + path + " " + name);
+    }
+    if (!users.empty()) return;
+    // One that the last user was deleted from still has its first line.
+    std::string word;
+    if (!(std::ifstream(path) >> word)) {
+        fail(path,
+             "it is empty, as a full disk may leave it. Restore it, or add a user with: quenx-cimd "
+             "passwd --users " +
+                 path + " NAME");
+    }
+    QUENX_ERROR("%s names no user: nobody can log in over the network", path.c_str());
+}
+
 }  // namespace
 
 bool isUserName(const std::string& name) {
     return !name.empty() && name.size() <= 64 && name.find(':') == std::string::npos && name[0] != '#' &&
-           std::all_of(name.begin(), name.end(), [](char c) { return c > ' ' && c != 0x7F; });
+           std::all_of(name.begin(), name.end(), [](unsigned char c) { return c > ' ' && c != 0x7F; });
 }
 
 UserEntries readUsersFile(const std::string& path) {
@@ -95,6 +119,7 @@ UserEntries readUsersFile(const std::string& path) {
     UserEntries users;
     std::string line;
     for (std::size_t number = 1; std::getline(file, line); ++number) {
+        if (line.ends_with('\r')) line.pop_back();  // of an editor elsewhere
         if (line.empty() || line[0] == '#') continue;
         std::string name;
         UserEntry entry = readEntry(path, number, line, name);
@@ -147,6 +172,7 @@ UsersFile::UsersFile(std::string path) : m_path(std::move(path)) {
 
 void UsersFile::reload() {
     UserEntries users = readUsersFile(m_path);
+    requireUsable(m_path, users);
     // By the method of the file's own hashes, so that an unknown user costs what a known one does.
     std::string decoy = users.empty() ? hashPassword("") : users.begin()->second.hash;
     const utils::Mutex::AutoLocker lock(m_mutex);

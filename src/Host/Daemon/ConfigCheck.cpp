@@ -86,7 +86,7 @@ void checkTls(const TlsSettings& settings) {
 void checkAuthentication(const AuthenticationSettings& settings) {
     const std::string service = "/etc/pam.d/quenx-cimd";
     if (settings.method == "users") {
-        readUsersFile(settings.usersFile);
+        UsersFile(settings.usersFile);
     } else if (!fs::exists(service)) {
         // It can work: "other" is strict on most systems, but whom it lets in is not this program's choice.
         warn(service +

@@ -37,7 +37,8 @@ std::string readPem(const std::string& file) {
         std::filesystem::exists(found) && !std::filesystem::is_regular_file(found))
         fail(file, "it is not a regular file");
     try {
-        if (const auto bytes = os::readWholeFile(file, SIZE_MAX)) return {bytes->begin(), bytes->end()};
+        constexpr std::size_t kLargest = 1 << 20;  // bytes; a chain of eight has some twenty thousand
+        if (const auto bytes = os::readWholeFile(file, kLargest)) return {bytes->begin(), bytes->end()};
     } catch (const std::system_error& error) {
         if (error.code().value() != EACCES) fail(file, error.code().message());
         throw std::runtime_error("Cannot read " + file + ": " + error.code().message() +
