@@ -132,7 +132,7 @@ TEST(RemoteConnectionTest, TakesNoAnswerForAnotherRequestsOrForNothing) {
 
 TEST(RemoteConnectionTest, SendsAChangeOnce) {
     const struct {
-        int connections;
+        int connections;  ///< on which a request arrived
         const char* said;
         void (*call)(core::CimOperations& operations, const core::CimPath& path);
     } table[] = {
@@ -144,9 +144,10 @@ TEST(RemoteConnectionTest, SendsAChangeOnce) {
     };
     const core::CimPath path("Y.Name=\"1\"");
     for (const auto& row : table) {
-        std::atomic<int> made{0};
-        const LoopbackServer server([&](int client, const std::string&) {
-            ++made;
+        std::atomic<int> sent{0};
+        const LoopbackServer server([&](int client, const std::string& request) {
+            // The library may connect again before it is kept from sending again.
+            if (!request.empty()) ++sent;
             // The connection is kept; the next request on it is taken, and gets no answer.
             LoopbackServer::sendBytes(client, "HTTP/1.1 200 OK\r\nContent-Length: 0\r\n\r\n");
             std::array<char, 4096> bytes{};
@@ -156,7 +157,7 @@ TEST(RemoteConnectionTest, SendsAChangeOnce) {
         EXPECT_THROW(row.call(*connection.operations, path), cli::NoAnswer);
         EXPECT_THAT([&] { row.call(*connection.operations, path); },
                     ThrowsMessage<cli::NoAnswer>(HasSubstr(row.said)));
-        EXPECT_EQ(made, row.connections);
+        EXPECT_EQ(sent, row.connections);
     }
 }
 
