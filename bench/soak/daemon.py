@@ -29,10 +29,10 @@ users_file = "{folder}/users"
 [limits]
 connections = 200
 connections_per_address = 60
-answer_bytes = 8388608
-header_seconds = 8
-request_seconds = 8
-idle_seconds = 8
+answer_bytes = 16777216
+header_seconds = 15
+request_seconds = 10
+idle_seconds = 20
 enumerations = 100
 enumerations_per_user = 50
 enumeration_seconds = 4

@@ -126,7 +126,7 @@ def unread_answers(life, random):
         readers = [stack.enter_context(_stranger(life.http, number, 4096)) for number in range(40)]
         for reader in readers:
             reader.sendall("\r\n".join(lines).encode() + body)
-        time.sleep(random.uniform(12, 15))
+        time.sleep(random.uniform(14, 17))
         for reader in readers:
             answer = _rest(reader)
             expect((status := _status(answer)) in (0, 200, 503), f"answered {status}")

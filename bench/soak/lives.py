@@ -23,7 +23,7 @@ UPDATED = "updates of the struck adapter"
 UNLOADED = "unloads by a foreign host"
 # What a process may have more at rest than at first, in KiB: little once all has happened to it, since then only a leak
 # goes on growing. The first floods make the C library keep memory for each of its arenas.
-WARM = 8192
+WARM = 16384
 COLD = 32768
 
 
