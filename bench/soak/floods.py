@@ -120,7 +120,7 @@ def hostile_xml(life, random):
 def unread_answers(life, random):
     body = wire.request("EnumerateClasses", DeepInheritance="TRUE", LocalOnly="FALSE", IncludeQualifiers="TRUE",
                         IncludeClassOrigin="TRUE")
-    head = {**wire.headers_for("guest", "guest"), "Host": "127.0.0.1", "Content-Length": str(len(body))}
+    head = {**wire.headers_for("guest", "guest"), "Content-Length": str(len(body))}
     lines = ["POST /cimom HTTP/1.1", *(f"{name}: {value}" for name, value in head.items()), "", ""]
     with contextlib.ExitStack() as stack:
         readers = [stack.enter_context(_stranger(life.http, number, 4096)) for number in range(40)]

@@ -41,7 +41,7 @@ def connect(life, way, address="127.0.0.1"):
 
 
 def headers_for(user, password):
-    return {"Content-Type": "application/xml", "CIMOperation": "MethodCall",
+    return {"Host": "localhost", "Content-Type": "application/xml", "CIMOperation": "MethodCall",
             "Authorization": "Basic " + base64.b64encode(f"{user}:{password}".encode()).decode()}
 
 
