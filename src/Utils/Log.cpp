@@ -122,7 +122,8 @@ void openLinuxLog() noexcept {
     if (logLevel.load() != -1) return;
     const std::int32_t level = levelFromEnvironment();
     // The system keeps the pointer, and the host may log when this library has gone.
-    openlog(::strdup("quenx"), openOptions(), LOG_USER);
+    static const char* const name = ::strdup("quenx");
+    openlog(name, openOptions(), LOG_USER);
     syslog(LOG_NOTICE, "Opening log, level=%d", level);
     syslog(LOG_NOTICE, "%s", kBanner);
     logLevel.store(level);
