@@ -13,7 +13,7 @@ class OddHostTest : public test::UpdateTest {};
 TEST_F(OddHostTest, SetsTheClockBackWhileAnUpdateRuns) {
     for (const bool fails : {false, true}) {
         const std::uint64_t begin = os::getMonotonicuSeconds();
-        const auto millisecondsOf = [this](const core::InstanceValue& job) {
+        const auto millisecondsOf = [](const core::InstanceValue& job) {
             return core::parseDatetime(text(job, "ElapsedTime"))->getMiliseconds();
         };
         if (fails) m_adapters->injectFault("eth0", {.at = ma::Operation::Write});
