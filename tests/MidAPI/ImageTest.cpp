@@ -55,7 +55,7 @@ TEST(OptionRomTest, TellsNoTypeByBytesThatWritingChanges) {
     for (const auto& [place, word] : {std::pair(3U, "iSCSI"), {kIndicator, "FCoE"}}) {
         Rom rom = test::madeRom({{PXE, 1}});
         ma::writeLe16(rom, 0x40 + ma::rom::kPnpProduct, static_cast<std::uint16_t>(place));
-        std::copy_n(word, std::strlen(word), rom.begin() + place);
+        std::copy_n(word, std::strlen(word), &rom.at(place));
         rom.back() = static_cast<std::uint8_t>(rom.back() - std::accumulate(rom.begin(), rom.end(), 0U));
         const Rom next = test::madeRom({{UEFI, 2}});
         // The first place leaves the image the last one, the second does not.
