@@ -72,6 +72,7 @@ TEST(AutoSingletonTest, MakesOneWholeInstanceOnTwoFirstCallsThatANewerOneHides) 
 TEST(OSLockerTest, IsTakenAndFreedByAScopeThatNeverWaits) {
     os::OSLockerLinux locker;
     const test::LogLevelGuard guard(2);
+    SyslogCapture::clear();
     {
         const OSLocker::AutoOSLocker scope;
         EXPECT_EQ(locker.Lock(), 2);
