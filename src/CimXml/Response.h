@@ -68,6 +68,8 @@ struct IntrinsicResult {
     std::vector<core::Argument> outputs = {};
     std::shared_ptr<const Origins> origins = {};  ///< null when class origins are not asked for
 };
+/// What its instances and paths take, as their buffers have it: a small element may become a large value.
+std::size_t bytesOf(const IntrinsicResult& result);
 
 struct Response {
     std::string messageId;

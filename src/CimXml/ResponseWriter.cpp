@@ -3,6 +3,7 @@
 
 #include "CimXml/ElementCodec.h"
 #include "CimXml/Response.h"
+#include "Framework/Requests/AnswerMeter.h"
 
 namespace cimxml {
 
@@ -162,6 +163,15 @@ std::string writeResponse(const Response& response) {
 
 std::string writeResponse(Response&& response, const std::function<void(std::size_t)>& grows) {
     return write(response, grows);
+}
+
+std::size_t bytesOf(const IntrinsicResult& result) {
+    std::size_t bytes = 0;
+    for (const core::InstanceValue& instance : result.instances)
+        bytes += core::bytesOf(instance);
+    for (const core::CimPath& path : result.paths)
+        bytes += core::bytesOf(path);
+    return bytes;
 }
 
 }  // namespace cimxml

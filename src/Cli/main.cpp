@@ -49,12 +49,8 @@ class NotedInterruptions {
         action.sa_flags = SA_RESTART | (isOnServer ? static_cast<int>(SA_RESETHAND) : 0);
         for (std::size_t i = 0; i < kInterruptions.size(); ++i)
             sigaction(kInterruptions[i], &action, &usualActions[i]);
-        // If the reader of a pipe has gone, or a file may not grow, writing fails, and the update goes on; so
-        // it does after a signal that means nothing here.
-        action.sa_handler = SIG_IGN;
-        for (const int signal :
-             {SIGPIPE, SIGXFSZ, SIGUSR1, SIGUSR2, SIGALRM, SIGVTALRM, SIGPROF, SIGIO, SIGPWR})
-            sigaction(signal, &action, nullptr);
+        // If the reader of a pipe has gone, writing fails, and the update goes on.
+        os::ignoreOtherSignals();
     }
     ~NotedInterruptions() { letInterruptionsEnd(); }
     NotedInterruptions(const NotedInterruptions&) = delete;

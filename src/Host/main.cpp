@@ -21,11 +21,7 @@ class Signals {
         for (const int signal : {SIGTERM, SIGINT, SIGHUP})
             ::sigaddset(&m_set, signal);
         ::pthread_sigmask(SIG_BLOCK, &m_set, nullptr);
-        // A client that goes away while it is answered must not end the daemon, nor a signal that means
-        // nothing here, in the middle of a flash.
-        for (const int signal :
-             {SIGPIPE, SIGXFSZ, SIGUSR1, SIGUSR2, SIGALRM, SIGVTALRM, SIGPROF, SIGIO, SIGPWR})
-            (void)std::signal(signal, SIG_IGN);
+        os::ignoreOtherSignals();
     }
 
     int wait() const {

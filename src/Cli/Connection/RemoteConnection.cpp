@@ -14,7 +14,6 @@
 #include "CimXml/WireError.h"
 #include "Cli/Connection/HttpClient.h"
 #include "Cli/Display/Messages.h"
-#include "Framework/Requests/AnswerMeter.h"
 #include "Utils/Os/Linux/EchoOff.h"
 #include "Utils/Utils.h"
 
@@ -79,16 +78,6 @@ void requireSameKeys(const core::InstanceValue& instance, const core::CimPath& p
 /// with empty ones.
 constexpr std::size_t kLargestList = std::size_t{256} << 20;
 constexpr std::size_t kLeastPiece = std::size_t{256} << 10;
-
-/// A small element may become a large value.
-std::size_t bytesOf(const IntrinsicResult& result) {
-    std::size_t bytes = 0;
-    for (const core::InstanceValue& instance : result.instances)
-        bytes += core::bytesOf(instance);
-    for (const core::CimPath& path : result.paths)
-        bytes += core::bytesOf(path);
-    return bytes;
-}
 
 /// An operation whose answer may be large: whole, and its form in pieces (DSP0200 5.4.2.24).
 struct Listing {

@@ -51,15 +51,6 @@ IntrinsicResult takeNext(IntrinsicResult& rest, std::size_t count) {
     return part;
 }
 
-std::size_t bytesOf(const IntrinsicResult& result) {
-    std::size_t bytes = 0;
-    for (const core::InstanceValue& instance : result.instances)
-        bytes += core::bytesOf(instance);
-    for (const core::CimPath& path : result.paths)
-        bytes += core::bytesOf(path);
-    return bytes;
-}
-
 bool isEmpty(const IntrinsicResult& rest) {
     return rest.instances.empty() && rest.paths.empty();
 }

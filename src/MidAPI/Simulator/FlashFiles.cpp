@@ -15,19 +15,9 @@ namespace ma {
 namespace {
 
 constexpr mode_t kFolderMode = 0755;
-constexpr mode_t kFileMode = 0600;
 
 [[noreturn]] void fail(const std::string& what) {
     throw std::system_error(errno, std::generic_category(), what);
-}
-
-/// A link in the state directory, or somebody else's file, must not lead the daemon, which is root, to
-/// another file. Sets errno otherwise.
-bool isOwnFile(int file) {
-    struct stat status {};
-    if (::fstat(file, &status) != 0) return false;
-    errno = !S_ISREG(status.st_mode) ? EINVAL : status.st_nlink > 1 ? EMLINK : EACCES;
-    return S_ISREG(status.st_mode) && status.st_nlink == 1 && status.st_uid == ::geteuid();
 }
 
 }  // namespace
@@ -39,9 +29,10 @@ void FlashFiles::makeFolder(const std::string& path) {
 }
 
 int FlashFiles::create(const std::string& path) {
-    const int file = os::aboveStandard(
-        ::open(path.c_str(), O_WRONLY | O_CREAT | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY, kFileMode));
-    if (file >= 0 && isOwnFile(file) && ::ftruncate(file, 0) == 0) return file;
+    // A link in the state directory, or somebody else's file, must not lead the daemon, which is root, to
+    // another file.
+    const int file = os::openOwnFile(path, O_WRONLY);
+    if (file >= 0 && ::ftruncate(file, 0) == 0) return file;
     const int error = errno;
     if (file >= 0) ::close(file);
     errno = error;

@@ -25,16 +25,12 @@ constexpr unsigned int kPoll = 5;  // ms
     throw std::system_error(error, std::generic_category(), "cannot lock " + path);
 }
 
-/// Writing the holder's number must not change a file that only bears this name, too; and nobody else may
-/// open, and so lock, the file.
-void requireOwnFile(int file, const std::string& path) {
+/// Nobody else may open, and so lock, the file.
+void closeToOthers(int file, const std::string& path) {
     struct stat status {};
     if (::fstat(file, &status) != 0) fail(path, errno);
-    if (!S_ISREG(status.st_mode)) fail(path, EINVAL);
-    if (status.st_nlink > 1) fail(path, EMLINK);
-    if (status.st_uid != ::geteuid()) fail(path, EACCES);
     const bool isOpenToOthers = (status.st_mode & (S_IRWXG | S_IRWXO)) != 0;
-    if (isOpenToOthers && status.st_uid == ::geteuid() && ::fchmod(file, kOwnerOnly) != 0) fail(path, errno);
+    if (isOpenToOthers && ::fchmod(file, kOwnerOnly) != 0) fail(path, errno);
 }
 
 /// flock has no time-out, so it is asked again and again. Returns 0, or the errno value.
@@ -71,10 +67,10 @@ std::string programOf(pid_t process) {
 }  // namespace
 
 FileLock::FileLock(const std::string& path, std::chrono::milliseconds patience)
-    : m_file(aboveStandard(::open(
-          path.c_str(), O_RDWR | O_CREAT | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY, kOwnerOnly))) {
+    // Writing the holder's number must not change a file that only bears this name, too.
+    : m_file(openOwnFile(path, O_RDWR)) {
     if (m_file.number() < 0) fail(path, errno);
-    requireOwnFile(m_file.number(), path);
+    closeToOthers(m_file.number(), path);
     const int error = lockWithin(m_file.number(), patience);
     m_held = error == 0;
     if (!m_held && error != EWOULDBLOCK) fail(path, error);

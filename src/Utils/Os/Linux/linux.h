@@ -56,9 +56,15 @@ QUENX_EXPORT std::size_t readFile(const std::string& path, std::span<std::uint8_
 QUENX_EXPORT std::optional<std::vector<std::uint8_t>> readWholeFile(const std::string& path,
                                                                     std::size_t most);
 
-/// The descriptor or, in its place, a copy with a number above 2: what others write to streams that their
-/// process has closed must not reach the file. -1 with errno set when there is none; never throws.
-QUENX_EXPORT int aboveStandard(int descriptor) noexcept;
+/// Has this process ignore the signals that mean nothing to it and would end it, in a flash too: a client or
+/// a reader that goes away, a file that may not grow, timers and user signals. For the first lines of main().
+QUENX_EXPORT void ignoreOtherSignals() noexcept;
+
+/// Opens a file that is this user's alone, and makes it if need be: a regular one, with one name, no link,
+/// and a number above 2, since what others write to streams that their process has closed must not reach it.
+/// @param access  O_WRONLY or O_RDWR
+/// @return -1 with errno set where there is none; never throws
+QUENX_EXPORT int openOwnFile(const std::string& path, int access) noexcept;
 
 /// True exactly when the path can be opened as a directory.
 QUENX_EXPORT bool isThisADir(const std::string& path) noexcept;
