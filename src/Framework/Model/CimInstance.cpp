@@ -18,25 +18,14 @@ namespace {
 
 thread_local DeclarationRecorder* currentRecorder = nullptr;
 
-/// What a shape depends on, as one text. Neither the class nor its name would do: two classes may add
-/// properties of their own to one binding. Addresses would not do either, which another library may reuse
-/// after an unload.
-std::string signatureOf(const std::vector<CimProperty*>& properties) {
-    std::string signature;
-    signature.reserve(properties.size() * 24);
-    for (const CimProperty* property : properties) {
-        signature += property->getName();
-        signature += property->isKey() ? '!' : ';';
-    }
-    return signature;
-}
-
 }  // namespace
 
 /// Which of the registered properties are served, as indices in the order of declaration: of every name the
 /// last one, since that is the most derived.
 struct CimInstance::Shape {
     explicit Shape(const std::vector<CimProperty*>& properties) {
+        for (const CimProperty* property : properties)
+            signature.emplace_back(property->getName(), property->isKey());
         std::set<std::string> seen;
         for (std::size_t i = properties.size(); i-- > 0;) {
             if (seen.insert(foldName(properties[i]->getName())).second) served.push_back(i);
@@ -46,6 +35,16 @@ struct CimInstance::Shape {
                      [&](std::size_t i) { return properties[i]->isKey(); });
     }
 
+    bool isOf(const std::vector<CimProperty*>& properties) const {
+        return std::ranges::equal(signature, properties, [](const auto& known, const CimProperty* property) {
+            return known.second == property->isKey() && known.first == property->getName();
+        });
+    }
+
+    /// What a shape depends on. Neither the class nor its name would do: two classes may add properties of
+    /// their own to one binding. Addresses would not do either, which another library may reuse after an
+    /// unload.
+    std::vector<std::pair<std::string, bool>> signature;
     std::vector<std::size_t> served;
     std::vector<std::size_t> keys;  ///< those of the served ones that are keys
 };
@@ -55,12 +54,13 @@ struct CimInstance::Shape {
 std::shared_ptr<const CimInstance::Shape> CimInstance::findShape(
     const std::vector<CimProperty*>& properties) {
     static utils::Mutex mutex;
-    static std::unordered_map<std::string, std::shared_ptr<const Shape>> shapes;
-    const std::string signature = signatureOf(properties);
+    // By the number of properties, which few classes share: comparing costs less than a hash of all names.
+    static std::unordered_map<std::size_t, std::vector<std::shared_ptr<const Shape>>> shapes;
     const utils::Mutex::AutoLocker lock(mutex);
-    auto& shape = shapes[signature];
-    if (shape == nullptr) shape = std::make_shared<const Shape>(properties);
-    return shape;
+    auto& candidates = shapes[properties.size()];
+    for (const auto& shape : candidates)
+        if (shape->isOf(properties)) return shape;
+    return candidates.emplace_back(std::make_shared<const Shape>(properties));
 }
 
 CimInstance::~CimInstance() = default;
