@@ -69,18 +69,12 @@ bool isRefusal(const utils::Exception& exception) {
     return codeOf(exception).has_value();
 }
 
-int verifyJobResultOfCurrentException() noexcept {
-    try {
-        throw;
-    } catch (const utils::Exception& exception) {
-        const std::optional<int> code = codeOf(exception);
-        if (!code) return VerifyJobResult::UnspecifiedError;
-        QUENX_ERROR("Exception: '%s'", exception.what());
-        return *code;
-    } catch (...) {
-        // What is not a refusal has logged itself, if it could.
-        return VerifyJobResult::UnspecifiedError;
-    }
+int verifyJobResultOf(const utils::Exception& exception) noexcept {
+    const std::optional<int> code = codeOf(exception);
+    // What is not a refusal has logged itself, if it could.
+    if (!code) return VerifyJobResult::UnspecifiedError;
+    QUENX_ERROR("Exception: '%s'", exception.what());
+    return *code;
 }
 
 unsigned int returnValueOf(const MethodKind& kind, int verifyJobResult, const std::string& target) {

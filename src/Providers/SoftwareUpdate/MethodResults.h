@@ -89,9 +89,8 @@ struct VerifyJobResult {
 /// failure on the way.
 bool isRefusal(const utils::Exception& exception);
 
-/// The code for the exception that is being handled; a refusal's text goes to the error log on the way.
-/// Call it within a catch block only. Never throws.
-int verifyJobResultOfCurrentException() noexcept;
+/// The code for the exception; a refusal's text goes to the error log on the way.
+int verifyJobResultOf(const utils::Exception& exception) noexcept;
 
 /// What tells the methods that only verify from those that install.
 struct MethodKind {

@@ -43,8 +43,10 @@ int Quenx_ConcreteJobClass::verifyOrCreateNewJob(std::string adapterName, std::s
         if (create) return createJob(order, job);
         verifyImage(order).claim.releaseIfConfigured();
         return VerifyJobResult::Success;
+    } catch (const utils::Exception& exception) {
+        return verifyJobResultOf(exception);
     } catch (...) {
-        return verifyJobResultOfCurrentException();
+        return VerifyJobResult::UnspecifiedError;
     }
 }
 

@@ -42,8 +42,10 @@ int resultOfExamining(const UpdateOrder& order) {
     try {
         examineImage(order);
         return VerifyJobResult::Success;
+    } catch (const utils::Exception& exception) {
+        return verifyJobResultOf(exception);
     } catch (...) {
-        return verifyJobResultOfCurrentException();
+        return VerifyJobResult::UnspecifiedError;
     }
 }
 
