@@ -51,14 +51,45 @@ struct PciIds {
     std::uint16_t subsystemDevice = 0;
 };
 
-/// What is known of an adapter port beside its firmware update.
+/// A version as the adapter's driver tells it, under the driver's own name: "fw.mgmt". The texts are free;
+/// one that the driver does not tell is empty.
+struct NamedVersion {
+    std::string name;
+    std::string fixed = {};    ///< of the board itself: never changes
+    std::string running = {};  ///< in force now
+    std::string stored = {};   ///< in the flash, in force after the reset that ResetNeeded names
+
+    /// What was written waits for a reset.
+    bool isPending() const { return !running.empty() && !stored.empty() && running != stored; }
+
+    bool operator==(const NamedVersion&) const = default;
+};
+
+/// What it takes until the firmware in the flash is the one that runs.
+enum class ResetNeeded {
+    None,        ///< it runs already
+    Reload,      ///< the driver can activate it while the machine runs
+    Reboot,      ///< the machine has to start anew
+    PowerCycle,  ///< the machine has to be without power for a moment
+    Unknown,     ///< the adapter does not tell
+};
+
+/// What is known of an adapter port beside its firmware update. What a backend cannot tell stays as it is
+/// here.
 struct AdapterInfo {
     std::array<std::uint8_t, 6> permanentMac{};
     std::uint64_t speed = 0;  ///< bits per second, 0 when unknown
     bool linkUp = false;
-    PciIds ids;
-    std::vector<utils::FirmwareVersionInfo> components;  ///< in ascending order of type
-    std::string description;
+    PciIds ids = {};
+    std::vector<utils::FirmwareVersionInfo> components = {};  ///< in ascending order of type
+    std::string description = {};
+    std::string backend = {};                 ///< the name of the one that reaches it: "simulator", "devlink"
+    std::string driver = {};                  ///< the kernel's
+    std::string serialNumber = {};            ///< of the device
+    std::string boardSerialNumber = {};       ///< of the board that carries it
+    std::vector<NamedVersion> versions = {};  ///< in the driver's order, each name once
+    ResetNeeded resetNeeded = ResetNeeded::None;
+    std::vector<std::string> interfaces = {};  ///< the network interfaces that run over the port
 };
 
 /// What an operation throws that has no other way to report a failure. The text is a whole sentence for

@@ -285,8 +285,12 @@ bool SimulatedAdapter::setBootType(BootType type) {
 AdapterInfo SimulatedAdapter::info() {
     try {
         FaultRun(m_faults, Operation::Info).reach();
-        return {m_description.mac, m_description.speed, m_description.linkUp,
-                m_description.ids, components(),        m_description.description};
+        return {.permanentMac = m_description.mac,
+                .speed = m_description.speed,
+                .linkUp = m_description.linkUp,
+                .ids = m_description.ids,
+                .components = components(),
+                .description = m_description.description};
     } catch (const std::runtime_error& failure) {
         throw AdapterError("adapter " + m_description.name + ": " + failure.what());
     }

@@ -132,7 +132,9 @@ bool Simulator::setBootType(const std::string& adapter, BootType type) {
 }
 
 AdapterInfo Simulator::getAdapterInfo(const std::string& adapter) {
-    return require(adapter).info();
+    AdapterInfo info = require(adapter).info();
+    info.backend = kName;
+    return info;
 }
 
 }  // namespace ma

@@ -18,6 +18,9 @@ class SimulatedAdapter;
 /// The backend of simulated adapters. Several processes may work on one state directory.
 class QUENX_EXPORT Simulator : public Backend {
   public:
+    /// By which AdapterInfo and the settings call it.
+    static constexpr const char* kName = "simulator";
+
     /// Throw AdapterError when the description, or a flash file that it names, has a mistake in it. The state
     /// directory need not be there: it is made at the first change.
     Simulator(const std::string& descriptionFile, const std::string& stateDirectory);
