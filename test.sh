@@ -3,9 +3,10 @@
 # Installs what is missing, builds, and runs all tests.
 #
 #   ./test.sh                 the default build and the one with the address and undefined-behaviour sanitizers
-#   ./test.sh --ci            these, 32-bit x86, the thread sanitizer, 10 s of each fuzz target, and elsewhere
-#   ./test.sh PRESET...       just these: release asan tsan x86-32 clang; fuzz, whose targets the build asan has; and
-#                             elsewhere, the demo and the release tests as another user in an odd folder
+#   ./test.sh --ci            these, 32-bit x86, the thread sanitizer, 10 s of each fuzz target, elsewhere and kernel
+#   ./test.sh PRESET...       just these: release asan tsan x86-32 clang; fuzz, whose targets the build asan has;
+#                             elsewhere, the demo and the release tests as another user in an odd folder; and kernel,
+#                             updates by the release build in a virtual machine with cards that the kernel flashes
 #
 # CI=true in the environment means --ci. JOBS=N sets how many jobs run at once (default: one for each processor).
 set -euo pipefail
@@ -15,14 +16,14 @@ jobs="${JOBS:-$(nproc)}"
 fuzz_seconds="${FUZZ_SECONDS:-10}"
 groups=(build run test)
 fuzz_build=build/asan
-all_presets=(release asan x86-32 tsan fuzz elsewhere clang)
+all_presets=(release asan x86-32 tsan fuzz elsewhere kernel clang)
 presets=()
 
 for argument in "$@"; do
     case "$argument" in
         --ci) CI=true ;;
         -h | --help)
-            sed -n '3,11s/^# \{0,1\}//p' "$0"
+            sed -n '3,12s/^# \{0,1\}//p' "$0"
             exit 0
             ;;
         -*)
@@ -42,11 +43,16 @@ for argument in "$@"; do
 done
 if [ "${#presets[@]}" = 0 ]; then
     presets=(release asan)
-    [ "${CI:-}" = true ] && presets+=(x86-32 tsan fuzz elsewhere)
+    [ "${CI:-}" = true ] && presets+=(x86-32 tsan fuzz elsewhere kernel)
 fi
 case " ${presets[*]} " in *" x86-32 "*) groups+=(x86-32) ;; esac
 
 packaging/install-packages.sh "${groups[@]}"
+# A virtual machine is not to be had everywhere.
+have_kernel=true
+case " ${presets[*]} " in
+    *" kernel "*) if packaging/install-packages.sh kernel; then tests/kernel/prepare.sh; else have_kernel=false; fi ;;
+esac
 . tools/environment.sh # a proxy was for the packages
 export ASAN_OPTIONS="${ASAN_OPTIONS:-detect_stack_use_after_return=1}"
 export UBSAN_OPTIONS="${UBSAN_OPTIONS:-print_stacktrace=1}"
@@ -113,6 +119,13 @@ run_fuzzers() {
     fi
 }
 
+run_kernel_tests() {
+    [ "$have_kernel" = true ] || return 0
+    cmake --preset release >/dev/null
+    cmake --build --preset release -j "$jobs" --target quenxctl quenx-cimd Quenx_SoftwareUpdate Quenx_SoftwareInventory
+    tests/kernel/run.sh
+}
+
 # The tests of a run that were skipped, each with the reason that it gave.
 skipped_tests() {
     local log="build/$1/Testing/Temporary/LastTest.log"
@@ -126,6 +139,7 @@ what_was_skipped() {
     for preset in "${presets[@]}"; do
         [ "$preset" = fuzz ] || skipped+="$(skipped_tests "$preset")"$'\n'
     done
+    [ "$have_kernel" = true ] || skipped+="  kernel: all of it: the packages for a virtual machine cannot be installed here"
     skipped="$(grep . <<<"$skipped" || true)"
     echo "== Skipped:${skipped:+$'\n'}${skipped:- no test}"
     if [ "${#contained[@]}" = 0 ]; then
@@ -141,8 +155,10 @@ for preset in "${presets[@]}"; do
     case "$preset" in
         fuzz) run_fuzzers ;;
         elsewhere) tests/elsewhere.sh ;;
+        kernel) run_kernel_tests ;;
         *) run_tests "$preset" ;;
     esac
 done
 what_was_skipped
+[ "$have_kernel" = true ] || presets=("${presets[@]/#kernel/kernel (skipped)}")
 echo "== All passed: ${presets[*]}"
