@@ -8,6 +8,7 @@
 #include <cerrno>
 #include <system_error>
 
+#include "Utils/Os/Linux/OwnFiles.h"
 #include "Utils/Os/Linux/linux.h"
 
 namespace ma {
@@ -40,13 +41,7 @@ int FlashFiles::create(const std::string& path) {
 }
 
 void FlashFiles::write(int descriptor, std::span<const std::uint8_t> bytes) {
-    // A signal, or a medium that is nearly full, ends a write early.
-    while (!bytes.empty()) {
-        const ssize_t written = ::write(descriptor, bytes.data(), bytes.size());
-        if (written < 0 && errno == EINTR) continue;
-        if (written < 0) fail("cannot write to the flash");
-        bytes = bytes.subspan(static_cast<std::size_t>(written));
-    }
+    os::writeAll(descriptor, bytes, "cannot write to the flash");
 }
 
 void FlashFiles::sync(int descriptor) {
@@ -58,9 +53,7 @@ void FlashFiles::rename(const std::string& from, const std::string& to) {
 }
 
 void FlashFiles::syncFolder(const std::string& path) {
-    const os::Descriptor folder(::open(path.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
-    if (folder.number() < 0) fail("cannot open the folder " + path);
-    if (::fsync(folder.number()) != 0) fail("cannot bring the folder " + path + " to the medium");
+    os::syncFolder(path);
 }
 
 }  // namespace ma

@@ -1,17 +1,14 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "MidAPI/Simulator/FlashStore.h"
 
-#include <fcntl.h>
 #include <sys/stat.h>
-#include <unistd.h>
 
 #include <algorithm>
-#include <cerrno>
 #include <stdexcept>
-#include <system_error>
 
 #include "MidAPI/Simulator/Fault.h"
 #include "Utils/Log.h"
+#include "Utils/Os/Linux/OwnFiles.h"
 
 namespace ma {
 namespace {
@@ -46,25 +43,6 @@ class RecordLock {
   private:
     const os::FileLock m_lock;
 };
-
-/// Closes a folder of this user's to all others: whoever can open a file can also lock it, and so hold up
-/// whoever else wants to. False when there is no folder.
-bool closeToOthers(const std::string& path) {
-    const os::Descriptor folder(::open(path.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC | O_NOFOLLOW));
-    if (folder.number() < 0 && errno == ENOENT) return false;
-    struct stat status {};
-    if (folder.number() < 0 || ::fstat(folder.number(), &status) != 0)
-        throw std::system_error(errno, std::generic_category(), "cannot use the folder " + path);
-    if (status.st_uid != ::geteuid()) {
-        throw std::system_error(EACCES, std::generic_category(),
-                                "the folder " + path + " belongs to user " + std::to_string(status.st_uid) +
-                                    ", who could exchange the flash; choose another one, or make it yours");
-    }
-    const bool isOpen = (status.st_mode & (S_IRWXG | S_IRWXO)) != 0;
-    if (isOpen && ::fchmod(folder.number(), S_IRWXU) != 0)
-        throw std::system_error(errno, std::generic_category(), "cannot protect the folder " + path);
-    return true;
-}
 
 }  // namespace
 
@@ -177,7 +155,7 @@ std::uint8_t FlashStore::bootedBank(const FlashState& state) const {
 
 void FlashStore::makeFolders() {
     const std::string& path = m_folder.path();
-    if (closeToOthers(path)) return;
+    if (os::closeFolderToOthers(path)) return;
     struct stat found {};
     // One by one, each entry brought to the medium: a folder that a power cut takes away takes the banks with
     // it.
@@ -191,7 +169,7 @@ void FlashStore::makeFolders() {
         }
         if (slash == std::string::npos) break;
     }
-    closeToOthers(path);
+    os::closeFolderToOthers(path);
 }
 
 void FlashStore::writeBank(std::uint8_t bank, std::span<const std::uint8_t> image,

@@ -8,6 +8,7 @@
 #include <optional>
 #include <span>
 #include <string>
+#include <utility>
 #include <vector>
 
 #include "Utils/Export.h"
@@ -79,12 +80,13 @@ class Descriptor {
     ~Descriptor() {
         if (m_number >= 0) ::close(m_number);
     }
+    Descriptor(Descriptor&& other) noexcept : m_number(std::exchange(other.m_number, -1)) {}
     Descriptor(const Descriptor&) = delete;
     Descriptor& operator=(const Descriptor&) = delete;
     int number() const noexcept { return m_number; }
 
   private:
-    const int m_number;
+    int m_number;
 };
 
 }  // namespace os
