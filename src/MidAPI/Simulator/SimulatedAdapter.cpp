@@ -127,18 +127,6 @@ class Pace {
     const std::chrono::steady_clock::time_point m_begin = std::chrono::steady_clock::now();
 };
 
-/// Marks the time during which an adapter is being written to, however that ends.
-class WritingScope {
-  public:
-    explicit WritingScope(Progress& progress) : m_progress(progress) { m_progress.begin(); }
-    WritingScope(const WritingScope&) = delete;
-    WritingScope& operator=(const WritingScope&) = delete;
-    ~WritingScope() { m_progress.end(); }
-
-  private:
-    Progress& m_progress;
-};
-
 }  // namespace
 
 SimulatedAdapter::SimulatedAdapter(AdapterDescription description, const std::string& stateDirectory,

@@ -1,7 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
-#include <algorithm>
 #include <cstdint>
 #include <memory>
 #include <optional>
@@ -11,48 +10,13 @@
 
 #include "MidAPI/AdapterTypes.h"
 #include "MidAPI/Image/OptionRom.h"
+#include "MidAPI/Progress.h"
 #include "MidAPI/Simulator/AdapterDescription.h"
 #include "MidAPI/Simulator/Fault.h"
 #include "MidAPI/Simulator/FlashStore.h"
 #include "Utils/Os/Linux/Mutex.h"
 
 namespace ma {
-
-/// The percentage of an adapter's update. Thread-safe.
-class Progress {
-  public:
-    std::uint16_t percent() const {
-        const utils::Mutex::AutoLocker lock(m_mutex);
-        return m_percent;
-    }
-
-    /// An image was prepared: a new update is at its beginning, unless one is being written.
-    void prepared() {
-        const utils::Mutex::AutoLocker lock(m_mutex);
-        if (!m_writing) m_percent = 0;
-    }
-
-    void begin() {
-        const utils::Mutex::AutoLocker lock(m_mutex);
-        m_writing = true;
-        m_percent = 0;
-    }
-
-    void advance(std::uint16_t percent) {
-        const utils::Mutex::AutoLocker lock(m_mutex);
-        m_percent = std::max(m_percent, percent);
-    }
-
-    void end() {
-        const utils::Mutex::AutoLocker lock(m_mutex);
-        m_writing = false;
-    }
-
-  private:
-    mutable utils::Mutex m_mutex;
-    bool m_writing QUENX_GUARDED_BY(m_mutex) = false;
-    std::uint16_t m_percent QUENX_GUARDED_BY(m_mutex) = 0;
-};
 
 /// One simulated adapter port: the operations of ma.h for it. Thread-safe.
 class SimulatedAdapter {
