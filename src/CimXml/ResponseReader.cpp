@@ -33,14 +33,19 @@ core::PropertyValue readProperty(const pugi::xml_node& element) {
     return property;
 }
 
-/// Sorted, since a server may send many thousands.
+bool isBefore(std::string_view left, std::string_view right) {
+    return std::ranges::lexicographical_compare(
+        left, right, [](char a, char b) { return utils::lowerCase(a) < utils::lowerCase(b); });
+}
+
+/// Sorted, since a server may send many thousands; views, since most send few, thousands of times.
 template <class Elements>
-std::vector<std::string> foldedNames(const Elements& elements) {
-    std::vector<std::string> names;
+std::vector<std::string_view> sortedNames(const Elements& elements) {
+    std::vector<std::string_view> names;
     names.reserve(elements.size());
     for (const auto& element : elements)
-        names.push_back(core::foldName(element.name));
-    std::ranges::sort(names);
+        names.push_back(element.name);
+    std::ranges::sort(names, isBefore);
     return names;
 }
 
@@ -51,17 +56,17 @@ core::InstanceValue readInstance(const pugi::xml_node& element) {
     for (const pugi::xml_node& child : childElements(element)) {
         if (!isElement(child, "QUALIFIER")) instance.properties.push_back(readProperty(child));
     }
-    const std::vector<std::string> names = foldedNames(instance.properties);
-    if (std::ranges::adjacent_find(names) != names.end())
+    const std::vector<std::string_view> names = sortedNames(instance.properties);
+    if (std::ranges::adjacent_find(names, core::sameName) != names.end())
         refuseElement(element, "has two properties of one name");
     return instance;
 }
 
 /// An INSTANCE does not say which of its properties are keys; the path in front of it does.
 void markKeys(core::InstanceValue& instance) {
-    const std::vector<std::string> keys = foldedNames(instance.path.getKeys());
+    const std::vector<std::string_view> keys = sortedNames(instance.path.getKeys());
     for (core::PropertyValue& property : instance.properties)
-        property.isKey = std::ranges::binary_search(keys, core::foldName(property.name));
+        property.isKey = std::ranges::binary_search(keys, property.name, isBefore);
 }
 
 /// VALUE.NAMEDINSTANCE, VALUE.OBJECTWITHPATH, VALUE.INSTANCEWITHPATH.
