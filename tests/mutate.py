@@ -2,10 +2,11 @@
 # SPDX-License-Identifier: Apache-2.0
 """Changes the code in small ways, one at a time, and tells which changes no test notices.
 
-    tests/mutate.py [--seed N] [--count N] [--only PATH]... [--list]
+    tests/mutate.py [--seed N] [--count N] [--skip N] [--only PATH]... [--list]
 
 --seed   chooses the changes; the same seed and tree give the same ones (default: from the clock; it is printed)
 --count  how many changes that compile are tried (default 80)
+--skip   goes on behind that many changes of the seed, compiled or not
 --only   changes files below PATH alone, such as src/MidAPI, or one line, such as src/MidAPI/ma.cpp:40
 --list   prints the changes and tries none
 
@@ -194,7 +195,7 @@ def first_failure(tests):
     """The name of the first test that fails twice, or None; and how long each that passed took."""
     waiting, running, took = collections.deque(tests), {}, {}
     while waiting or running:
-        while waiting and len(running) < JOBS:
+        while waiting and len(running) < 2 * JOBS:  # many wait more than they compute
             test = waiting.popleft()
             running[start(test)] = (test, time.monotonic())
         time.sleep(0.005)
@@ -255,8 +256,7 @@ def outcome(name, tests):
     room = room_of(name)
     tests = [test for test in tests if room not in FRONTS or test["room"] in ABOVE]
     first = [test for test in tests if test["room"] == room and test["seconds"] < LONG_SECONDS]
-    # Those who include a header may not compile any more, wherever they are.
-    programs = {pathlib.Path(test["command"][0]).name for test in first} if name.endswith(".cpp") else ()
+    programs = {pathlib.Path(test["command"][0]).name for test in first}
     for part, targets in (first, programs), ([test for test in tests if test not in first], ()):
         if not build(targets)[1]:
             return "does not compile"
@@ -305,6 +305,7 @@ def main():
     parser = argparse.ArgumentParser(description=__doc__, formatter_class=argparse.RawDescriptionHelpFormatter)
     parser.add_argument("--seed", type=int, default=int(time.time()))
     parser.add_argument("--count", type=int, default=80)
+    parser.add_argument("--skip", type=int, default=0)
     parser.add_argument("--only", action="append", default=[], metavar="PATH")
     parser.add_argument("--list", action="store_true")
     parser.add_argument("--run", action="store_true", help=argparse.SUPPRESS)
@@ -323,6 +324,7 @@ def main():
     if not changes:
         sys.exit("mutate.py: there is nothing to change there. --only takes a path such as src/MidAPI.")
     random.Random(options.seed).shuffle(changes)
+    del changes[:options.skip]
     print(f"seed {options.seed}, {len(changes)} possible changes", flush=True)
     if options.list:
         for name, number, kind, changed in changes[:options.count]:
