@@ -9,6 +9,7 @@
 #include <stdexcept>
 #include <system_error>
 
+#include "MidAPI/Image/Bytes.h"
 #include "MidAPI/Image/OptionRom.h"
 #include "Utils/Os/Linux/linux.h"
 

@@ -12,9 +12,6 @@
 
 namespace ma {
 
-/// CRC-32 as in IEEE 802.3 (reflected, polynomial 0x04C11DB7, start and final inversion).
-std::uint32_t crc32(std::span<const std::uint8_t> bytes);
-
 /// One bank: how long its content is, and its checksum. Length 0: nothing was written to it yet.
 struct FlashBank {
     std::uint32_t length = 0;

@@ -6,6 +6,7 @@
 #include <algorithm>
 #include <stdexcept>
 
+#include "MidAPI/Image/Bytes.h"
 #include "MidAPI/Simulator/Fault.h"
 #include "Utils/Log.h"
 #include "Utils/Os/Linux/OwnFiles.h"
