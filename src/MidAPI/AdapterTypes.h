@@ -32,6 +32,15 @@ enum PrepareStatus : int {
     UnspecifiedError = 6,    ///< the adapter itself could not be read
 };
 
+/// What can be said of an image file before it is written.
+struct ImageVerdict {
+    PrepareStatus status = PrepareStatus::Prepared;  ///< what prepareFlashImage() answers
+    std::string reason = {};  ///< a sentence for people; empty for PrepareStatus::Prepared
+    /// What is left to the adapter, which judges the file in the write; each the rest of a sentence that
+    /// begins with "It could not be checked".
+    std::vector<std::string> unchecked = {};
+};
+
 /// Error codes that writeFlashImage() and updateCapabilityWord() leave behind; a backend or a simulated fault
 /// may leave others.
 enum WriteError : std::uint32_t {

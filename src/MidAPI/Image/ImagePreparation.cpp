@@ -44,15 +44,6 @@ std::string anyMismatch(const PreparationTarget& target, const RomFile& rom) {
     return {};
 }
 
-/// The requested types, ascending, each once, without type 0.
-Types normalised(Types types) {
-    std::erase(types, utils::FirmwareType{});
-    // Callers pass what clients wrote: any order, doubles included.
-    std::sort(types.begin(), types.end());
-    types.erase(std::unique(types.begin(), types.end()), types.end());
-    return types;
-}
-
 bool isWanted(const RomImage& image, const Types& requested) {
     if (requested.empty()) return image.type != utils::FirmwareType{};
     return std::ranges::any_of(requested, [&](utils::FirmwareType type) { return image.carries(type); });
@@ -119,7 +110,7 @@ Preparation assessImage(const PreparationTarget& target, std::span<const std::ui
     if (!target.canBeUpdated)
         return refuse(PrepareStatus::ImageNotSupported, "this adapter cannot be updated");
 
-    const Types wanted = normalised(requested);
+    const Types wanted = distinctTypes(requested);
     RomFile chosen = chooseImages(rom, wanted);
     if (std::string reason = notApplicable(rom, wanted, chosen); !reason.empty())
         return refuse(PrepareStatus::ImageNotApplicable, std::move(reason));
@@ -139,6 +130,13 @@ Preparation assessImage(const PreparationTarget& target, std::span<const std::ui
     }
     result.chosen = std::move(chosen.images);
     return result;
+}
+
+Types distinctTypes(Types types) {
+    std::erase(types, utils::FirmwareType{});
+    std::sort(types.begin(), types.end());
+    types.erase(std::unique(types.begin(), types.end()), types.end());
+    return types;
 }
 
 bool hasOutput(PrepareStatus status) {

@@ -41,6 +41,9 @@ QUENX_EXPORT Preparation assessImage(const PreparationTarget& target, std::span<
 /// True when the output of the preparation is an image that may be written.
 QUENX_EXPORT bool hasOutput(PrepareStatus status);
 
+/// The types, ascending, each once, without type 0: callers pass what clients wrote.
+QUENX_EXPORT std::vector<utils::FirmwareType> distinctTypes(std::vector<utils::FirmwareType> types);
+
 /// Writes the chosen images as one chain; `output` is at least as long as the file. Returns the chain's
 /// length.
 QUENX_EXPORT std::size_t composeChosen(const Preparation& preparation, std::span<const std::uint8_t> file,
