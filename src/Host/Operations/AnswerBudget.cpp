@@ -17,8 +17,9 @@ namespace {
 constexpr std::size_t kUncounted = std::size_t{64} << 10;
 
 /// Once answers have given back so much, so does the process: the C library would keep it, once for each of
-/// its arenas.
+/// its arenas. While others are being written, they use it again, and only so often does it go back.
 constexpr std::size_t kTrimmed = std::size_t{32} << 20;
+constexpr std::chrono::seconds kBetweenTrims(1);
 
 std::size_t countedOf(std::size_t bytes) {
     return bytes <= kUncounted ? 0 : (bytes + kUncounted - 1) / kUncounted * kUncounted;
@@ -47,8 +48,11 @@ void AnswerBudget::giveBack(const std::string& user, std::size_t bytes) noexcept
         own->second -= bytes;
         if (own->second == 0) m_byUser.erase(own);
         m_givenBack += bytes;
-        if (m_givenBack < kTrimmed) return;
+        const auto now = std::chrono::steady_clock::now();
+        const bool isDue = m_taken == 0 || now - m_trimmed >= kBetweenTrims;
+        if (m_givenBack < kTrimmed || !isDue) return;
         m_givenBack = 0;
+        m_trimmed = now;
     }
     // Takes milliseconds, during which nobody should have to wait for the budget.
     ::malloc_trim(0);

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include <chrono>
 #include <cstddef>
 #include <map>
 #include <new>
@@ -40,6 +41,7 @@ class AnswerBudget {
     std::size_t m_taken QUENX_GUARDED_BY(m_mutex) = 0;
     std::map<std::string, std::size_t> m_byUser QUENX_GUARDED_BY(m_mutex);
     std::size_t m_givenBack QUENX_GUARDED_BY(m_mutex) = 0;  ///< since the system got memory back
+    std::chrono::steady_clock::time_point m_trimmed QUENX_GUARDED_BY(m_mutex) = {};  ///< when it did
 };
 
 /// What one answer takes of the budget, which must outlive it. Gives it back at its end, so what it counts
