@@ -1,5 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 #include <algorithm>
+#include <new>
 
 #include "Host/Authentication/LoginQueue.h"
 
@@ -27,7 +28,7 @@ FailureDelays::Clock::time_point FailureDelays::lastOf(const std::string& key) c
     return found == m_records.end() ? Clock::time_point::min() : found->second.last;
 }
 
-FailureDelays::Record& FailureDelays::recordOf(const std::string& key, Clock::time_point now) {
+FailureDelays::Record* FailureDelays::recordOf(const std::string& key, Clock::time_point now) noexcept try {
     std::erase_if(m_records, [&](const auto& each) { return now - each.second.last > kForgetAfter; });
     // An attacker with many addresses must not cost memory; the one quiet for longest matters least.
     if (m_records.size() >= kMaxRecords && !m_records.contains(key)) {
@@ -37,19 +38,21 @@ FailureDelays::Record& FailureDelays::recordOf(const std::string& key, Clock::ti
     }
     Record& record = m_records[key];
     record.last = now;
-    return record;
+    return &record;
+} catch (const std::bad_alloc&) {
+    return nullptr;
 }
 
-void FailureDelays::admitted(const std::string& key, Clock::time_point now) {
-    Record& record = recordOf(key, now);
+void FailureDelays::admitted(const std::string& key, Clock::time_point now) noexcept {
     // Those that wait take turns, so the next one waits as if this had failed already.
-    record.next = now + delayAfter(record.failures);
+    if (Record* record = recordOf(key, now)) record->next = now + delayAfter(record->failures);
 }
 
-void FailureDelays::failed(const std::string& key, Clock::time_point now) {
-    Record& record = recordOf(key, now);
-    ++record.failures;
-    record.next = std::max(record.next, now + delayAfter(record.failures));
+void FailureDelays::failed(const std::string& key, Clock::time_point now) noexcept {
+    Record* record = recordOf(key, now);
+    if (record == nullptr) return;
+    ++record->failures;
+    record->next = std::max(record->next, now + delayAfter(record->failures));
 }
 
 void FailureDelays::succeeded(const std::string& key) {

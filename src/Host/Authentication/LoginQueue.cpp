@@ -39,7 +39,7 @@ std::vector<LoginQueue::Waiter*>::iterator LoginQueue::next(Clock::time_point no
     return first;
 }
 
-void LoginQueue::callNext() {
+void LoginQueue::callNext() noexcept {
     const auto now = Clock::now();
     for (auto each = next(now); each != m_waiting.end(); each = next(now)) {
         Waiter& waiter = **each;
@@ -54,7 +54,7 @@ void LoginQueue::callNext() {
 
 /// A failure delays those who could have gone, and only waited for others to be done. Nobody may come any
 /// more, so one of them has to see to it that they go.
-void LoginQueue::chooseTimekeeper() {
+void LoginQueue::chooseTimekeeper() noexcept {
     const auto first = std::min_element(m_waiting.begin(), m_waiting.end(), [&](auto left, auto right) {
         return readyAt(left->attempt) < readyAt(right->attempt);
     });

@@ -35,9 +35,10 @@ class FailureDelays {
     /// When the last one was looked at; the beginning of time for none.
     Clock::time_point lastOf(const std::string& key) const;
 
-    /// An attempt is looked at.
-    void admitted(const std::string& key, Clock::time_point now);
-    void failed(const std::string& key, Clock::time_point now);
+    /// An attempt is looked at. Without memory, neither is remembered: a queue that has begun to call
+    /// somebody must go on.
+    void admitted(const std::string& key, Clock::time_point now) noexcept;
+    void failed(const std::string& key, Clock::time_point now) noexcept;
     void succeeded(const std::string& key);
 
   private:
@@ -47,7 +48,8 @@ class FailureDelays {
         Clock::time_point last;
     };
 
-    Record& recordOf(const std::string& key, Clock::time_point now);
+    /// Null without memory.
+    Record* recordOf(const std::string& key, Clock::time_point now) noexcept;
     Clock::duration delayAfter(unsigned int failures) const;
 
     const Clock::duration m_first;
@@ -110,8 +112,8 @@ class LoginQueue {
     void failed(const Attempt& attempt);
     Clock::time_point readyAt(const Attempt& attempt) const;
     std::vector<Waiter*>::iterator next(Clock::time_point now);
-    void callNext();
-    void chooseTimekeeper();
+    void callNext() noexcept;
+    void chooseTimekeeper() noexcept;
 
     const LoginPace m_pace;
     std::mutex m_mutex;
