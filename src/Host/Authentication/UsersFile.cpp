@@ -11,11 +11,14 @@
 #include <cstring>
 #include <filesystem>
 #include <fstream>
+#include <span>
 #include <sstream>
 #include <stdexcept>
+#include <system_error>
 
 #include "Host/Authentication/PasswordChecker.h"
 #include "Utils/Log.h"
+#include "Utils/Os/Linux/OwnFiles.h"
 #include "Utils/Os/Linux/linux.h"
 #include "Utils/Utils.h"
 
@@ -28,8 +31,9 @@ namespace {
 }
 
 [[noreturn]] void failToWrite(const std::string& path, int error) {
-    throw std::runtime_error("Cannot write " + path + ": " + std::strerror(error) +
-                             ". Run as root, or name another file with --users.");
+    const char* advice = ::geteuid() == 0 ? ". Mend that" : ". Run as root";
+    throw std::runtime_error("Cannot write " + path + ": " + std::strerror(error) + advice +
+                             ", or name another file with --users.");
 }
 
 /// Equal without telling by the time it takes where the difference is.
@@ -142,10 +146,15 @@ void writeUsersFile(const std::string& path, const UserEntries& users) {
     const std::string fresh = path + ".new";
     ::unlink(fresh.c_str());
     const os::Descriptor file(::open(fresh.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0600));
-    if (file.number() < 0 ||
-        ::write(file.number(), text.data(), text.size()) != static_cast<ssize_t>(text.size()) ||
-        ::fsync(file.number()) != 0)
-        failToWrite(fresh, errno);
+    if (file.number() < 0) failToWrite(fresh, errno);
+    try {
+        os::writeAll(file.number(),
+                     std::span(reinterpret_cast<const std::uint8_t*>(text.data()), text.size()), fresh);
+        if (::fsync(file.number()) != 0) throw std::system_error(errno, std::generic_category());
+    } catch (const std::system_error& failure) {
+        ::unlink(fresh.c_str());
+        failToWrite(fresh, failure.code().value());
+    }
     if (::rename(fresh.c_str(), path.c_str()) != 0) failToWrite(path, errno);
 }
 
