@@ -117,10 +117,10 @@ void requireOk(const HttpReply& reply) {
         case 200:
             return;
         case 401:
-            throw CommandError(ExitStatus::Failed, "The server does not accept the user name and password.",
+            throw LoginRefused(ExitStatus::Failed, "The server does not accept the user name and password.",
                                "Check --user or QUENXCTL_USER, and QUENXCTL_PASSWORD or what was typed.");
         case 403:
-            throw CommandError(
+            throw LoginRefused(
                 ExitStatus::Failed, "This user may not use the server.",
                 "On quenx-cimd, log in as root, as a member of the group quenx-admin, or as a user whom "
                 "its setting auth.readers names.");

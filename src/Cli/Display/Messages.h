@@ -45,6 +45,12 @@ class CommandError : public std::runtime_error {
     std::string m_advice;
 };
 
+/// The server does not let the user in: asking again would be answered the same, and counts as guessing.
+class LoginRefused : public CommandError {
+  public:
+    using CommandError::CommandError;
+};
+
 /// Why a file could not be read: `error` is an errno. NotFound for one that is not there.
 Explanation cannotRead(const std::string& file, int error);
 

@@ -81,6 +81,11 @@ JobView lookAt(core::CimOperations& operations, const core::CimPath& job, const 
     // The update survives a broken connection, so give up only after this many failures in a row.
     constexpr unsigned kMaxFailures = 20;
     std::string reason;
+    const auto giveUp = [&] {
+        return CommandError(ExitStatus::Unknown, reason,
+                            "The update may still be running: \"quenxctl jobs\" shows it. If the server was "
+                            "restarted, \"quenxctl adapters\" shows which firmware is there.");
+    };
     for (unsigned failures = 0; failures < kMaxFailures; ++failures) {
         if (failures > 0) following.pause();
         try {
@@ -88,6 +93,9 @@ JobView lookAt(core::CimOperations& operations, const core::CimPath& job, const 
             const auto state = instance.get<std::uint64_t>("JobState");
             if (state && *state <= std::numeric_limits<std::uint16_t>::max()) return viewOf(instance);
             reason = "The job has no state that can be read.";
+        } catch (const LoginRefused& error) {
+            reason = error.what();
+            throw giveUp();
         } catch (const CommandError& error) {
             if (error.status() == ExitStatus::Interrupted) throw;
             reason = error.what();
@@ -96,9 +104,7 @@ JobView lookAt(core::CimOperations& operations, const core::CimPath& job, const 
             reason = std::string("The job cannot be read: ") + error.what() + ".";
         }
     }
-    throw CommandError(ExitStatus::Unknown, reason,
-                       "The update may still be running: \"quenxctl jobs\" shows it. If the server was "
-                       "restarted, \"quenxctl adapters\" shows which firmware is there.");
+    throw giveUp();
 }
 
 }  // namespace
