@@ -234,6 +234,10 @@ void SimulatedAdapter::writeLocked(std::span<const std::uint8_t> image) {
     if (const RomFile rom = parseOptionRom(merged); rom.error)
         throw OperationFailure(WriteError::BadImage,
                                "with what the adapter keeps it would not be a ROM: " + *rom.error);
+    // As a flash file: a larger bank could not be found again if its record were lost.
+    if (merged.size() > kMaxFlash)
+        throw OperationFailure(WriteError::BadImage,
+                               "with what the adapter keeps it would be longer than its flash, 64 MiB");
     const WritingScope writing(m_progress);
     const Pace pace(m_description.writeSpeed);
     FaultRun faults(m_faults, Operation::Write);
