@@ -41,31 +41,51 @@ class Signals {
     sigset_t m_set{};
 };
 
+/// What a daemon that may be writing to an adapter must survive, a lack of memory above all: there is nobody
+/// to tell it to, and it goes on as it was.
+template <class Work>
+void withoutFail(Work work) noexcept {
+    try {
+        work();
+    } catch (const std::exception&) {
+    }
+}
+
 void serve(host::Daemon& daemon, const Signals& signals) {
     const std::string serving = "Serving " + daemon.addresses();
     host::notifyServiceManager("READY=1\nSTATUS=" + serving);
     host::report(serving);
     while (signals.wait() == SIGHUP) {
-        host::notifyServiceManager("RELOADING=1");
-        daemon.reload();
-        host::notifyServiceManager("READY=1\nSTATUS=" + serving);
+        withoutFail([&] {
+            host::notifyServiceManager("RELOADING=1");
+            daemon.reload();
+            host::notifyServiceManager("READY=1\nSTATUS=" + serving);
+        });
     }
 }
 
 void stop(host::Daemon& daemon, const Signals& signals) {
-    host::report("Stopping.");
-    host::notifyServiceManager("STOPPING=1\nSTATUS=Stopping.");
+    withoutFail([] {
+        host::report("Stopping.");
+        host::notifyServiceManager("STOPPING=1\nSTATUS=Stopping.");
+    });
     daemon.stopAccepting();
     std::string said;
-    for (std::string rest = daemon.unfinished(); !rest.empty(); rest = daemon.unfinished()) {
-        const std::string waiting = "Waiting for " + rest + ".";
-        if (rest != said) host::report(waiting);
-        said = rest;
-        // Thirty seconds more each time, since a flash takes longer than the service manager waits for a
-        // stop.
-        host::notifyServiceManager("EXTEND_TIMEOUT_USEC=30000000\nSTATUS=" + waiting);
+    for (bool isDone = false; !isDone;) {
+        withoutFail([&] {
+            const std::string rest = daemon.unfinished();
+            isDone = rest.empty();
+            if (isDone) return;
+            const std::string waiting = "Waiting for " + rest + ".";
+            if (rest != said) host::report(waiting);
+            said = rest;
+            // Thirty seconds more each time, since a flash takes longer than the service manager waits for a
+            // stop.
+            host::notifyServiceManager("EXTEND_TIMEOUT_USEC=30000000\nSTATUS=" + waiting);
+        });
         // An adapter that is written to half is worse than a slow stop.
-        if (signals.waitBriefly() != 0) host::report("Asked again to stop. Still waiting for " + rest + ".");
+        if (!isDone && signals.waitBriefly() != 0)
+            withoutFail([&] { host::report("Asked again to stop. Still waiting for " + said + "."); });
     }
 }
 

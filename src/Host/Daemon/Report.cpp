@@ -46,7 +46,9 @@ void notifyServiceManager(const std::string& state) {
     // Without the library of systemd: if there is no systemd, it is missing, and two calls do the same.
     const int socket = ::socket(AF_UNIX, SOCK_DGRAM | SOCK_CLOEXEC, 0);
     if (socket < 0) return;
-    ::sendto(socket, state.data(), state.size(), MSG_NOSIGNAL, reinterpret_cast<const sockaddr*>(&address),
+    // A manager that has stopped reading must not stop the daemon.
+    ::sendto(socket, state.data(), state.size(), MSG_NOSIGNAL | MSG_DONTWAIT,
+             reinterpret_cast<const sockaddr*>(&address),
              static_cast<socklen_t>(offsetof(sockaddr_un, sun_path) + length));
     ::close(socket);
 }

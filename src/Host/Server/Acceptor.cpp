@@ -4,7 +4,9 @@
 #include <unistd.h>
 
 #include <cerrno>
+#include <chrono>
 #include <cstring>
+#include <new>
 #include <utility>
 
 #include "Host/Authentication/ClientAddress.h"
@@ -48,13 +50,16 @@ std::optional<std::uint64_t> Acceptor::admit(int socket, const sockaddr& address
     }
 }
 
-void Acceptor::pause(int error, const std::stop_token& stop) {
+void Acceptor::pause(int error, const std::stop_token& stop) try {
     // A client that has gone already costs nothing. All else, descriptors and memory above all, takes others
     // to end first: trying on at once would take a whole processor.
     if (error == EINTR || error == ECONNABORTED || stop.stop_requested()) return;
     m_watch.noteLimit("a limit of the system",
                       std::string("a connection has to wait: ") + std::strerror(error));
     m_watch.giveUpOne(stop);
+} catch (const std::bad_alloc&) {
+    // Descriptors and memory ran out together. The next round tries again.
+    std::this_thread::sleep_for(std::chrono::milliseconds(100));
 }
 
 }  // namespace host
