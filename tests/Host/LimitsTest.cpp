@@ -53,6 +53,9 @@ TEST(UserSlotsTest, MakeOnlyTheirOwnUserWait) {
     EXPECT_TRUE(first && *second);
     EXPECT_FALSE(host::HeldUserSlot(slots, "a", 0ms));
     EXPECT_TRUE(host::HeldUserSlot(slots, "b", 0ms));
+    std::stop_source ended;
+    ended.request_stop();
+    EXPECT_FALSE(host::HeldUserSlot(slots, "a", 1h, ended.get_token())) << "nobody waits for a lost client";
     second.reset();
     EXPECT_TRUE(host::HeldUserSlot(slots, "a", 0ms));
 }
@@ -99,6 +102,19 @@ TEST_F(ConnectionRoomTest, KeepsAQuarterForNetworksFromWhichSomebodyLoggedIn) {
     EXPECT_EQ(ended(), "a1z3") << "then a stranger makes room";
     EXPECT_TRUE(admit("K"));
     EXPECT_EQ(ended(), "a1z3K8") << "as many as one network may have";
+}
+
+TEST_F(ConnectionRoomTest, IsMadeByTheOldestOfThoseWhoHaveEquallyMany) {
+    for (const char* stranger : {"f", "e", "d", "c", "b", "a", "x"})
+        EXPECT_TRUE(admit(stranger));
+    EXPECT_EQ(ended(), "f0") << "not by a network of an attacker's choice";
+}
+
+TEST_F(ConnectionRoomTest, LeavesNewcomersTheTimeToLogIn) {
+    for (const char* network : {"a", "b", "c", "d", "e", "f", "g", "h"})
+        EXPECT_TRUE(admit(network, "many"));
+    EXPECT_TRUE(admit("a") && admit("b") && admit("c"));
+    EXPECT_EQ(ended(), "a0b1c2") << "as long as one user has more than a quarter";
 }
 
 TEST_F(ConnectionRoomTest, IsNotMadeByThoseWhoLoggedIn) {

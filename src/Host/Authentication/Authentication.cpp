@@ -25,7 +25,10 @@ std::optional<std::string> decodeBase64(std::string text) {
     const gnutls_datum_t encoded{reinterpret_cast<unsigned char*>(text.data()),
                                  static_cast<unsigned int>(text.size())};
     gnutls_datum_t decoded{nullptr, 0};
-    if (::gnutls_base64_decode2(&encoded, &decoded) != GNUTLS_E_SUCCESS) return std::nullopt;
+    const int outcome = ::gnutls_base64_decode2(&encoded, &decoded);
+    // Not the client's fault, who would ask for another password.
+    if (outcome == GNUTLS_E_MEMORY_ERROR) throw std::bad_alloc();
+    if (outcome != GNUTLS_E_SUCCESS) return std::nullopt;
     std::string bytes(reinterpret_cast<const char*>(decoded.data), decoded.size);
     ::gnutls_memset(decoded.data, 0, decoded.size);
     ::gnutls_free(decoded.data);
@@ -56,6 +59,14 @@ void waitUntil(std::chrono::steady_clock::time_point time, const std::stop_token
 }
 
 }  // namespace
+
+HeldSlot::HeldSlot(Slots& slots, std::chrono::milliseconds patience, const std::stop_token& stop)
+    : m_slots(slots) {
+    constexpr std::chrono::milliseconds kLook(100);  // a semaphore cannot wait for a token
+    const auto until = std::chrono::steady_clock::now() + patience;
+    while (!m_isHeld && !stop.stop_requested() && std::chrono::steady_clock::now() < until)
+        m_isHeld = slots.try_acquire_for(kLook);
+}
 
 Authentication::Authentication(std::unique_ptr<PasswordChecker> checker, std::chrono::seconds rememberFor,
                                const LoginPace& pace)

@@ -20,11 +20,10 @@ namespace host {
 /// How many may do something at a time; the others wait for their turn.
 using Slots = std::counting_semaphore<>;
 
-/// One of the slots, held for the scope; false when none came free in time.
+/// One of the slots, held for the scope; false when none came free in time, or the wait was stopped.
 class HeldSlot {
   public:
-    HeldSlot(Slots& slots, std::chrono::milliseconds patience)
-        : m_slots(slots), m_isHeld(slots.try_acquire_for(patience)) {}
+    HeldSlot(Slots& slots, std::chrono::milliseconds patience, const std::stop_token& stop);
     ~HeldSlot() {
         if (m_isHeld) m_slots.release();
     }
@@ -35,7 +34,7 @@ class HeldSlot {
 
   private:
     Slots& m_slots;
-    const bool m_isHeld;
+    bool m_isHeld = false;
 };
 
 /// Remembers for a short while whose credentials were right, since checking a password costs tens of

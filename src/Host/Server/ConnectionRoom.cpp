@@ -63,8 +63,10 @@ bool ConnectionWatch::endOldestOfMost(const Condition& isMeant) {
         if (!watched.isEnded && isMeant(watched)) ++counts[watched.network];
     }
     const auto most = mostFrequent(counts);
-    return most != counts.end() &&
-           endOldest([&](const Watched& each) { return each.network == most->first && isMeant(each); });
+    // Of all networks that have as many, or one of the attacker's choice would always give way to his others.
+    return most != counts.end() && endOldest([&](const Watched& each) {
+               return isMeant(each) && counts.at(each.network) == most->second;
+           });
 }
 
 std::string ConnectionWatch::busiestUser(const Condition& isMeant, unsigned int limit) const {
@@ -106,10 +108,10 @@ bool ConnectionWatch::makeRoom(const std::string& network, Room& room) {
         (!isKnown(network) && count(isStranger) >= m_limits.connections - keptForKnown(m_limits));
     if (!isFull) return true;
     room.reached = "limits.connections (" + std::to_string(m_limits.connections) + ")";
-    // If there is no stranger, a newcomer is the first: he has a right to the place of one who is only known
-    // by his network.
-    return endOldestOfMost(isStranger) || endOldestOfMost(isNew) ||
-           endOneOfBusiestUser(isRemote, m_limits.connections, room);
+    // A user with more than his share gives way to newcomers of known networks, who need their time to log
+    // in: were one of them the first to go, those who come all the time would end each other.
+    return endOldestOfMost(isStranger) || endOneOfBusiestUser(isRemote, m_limits.connections, room) ||
+           endOldestOfMost(isNew);
 }
 
 std::optional<std::uint64_t> ConnectionWatch::admit(int socket, const std::string& network,

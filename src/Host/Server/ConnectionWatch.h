@@ -34,9 +34,10 @@ class ConnectionWatch {
     ConnectionWatch& operator=(const ConnectionWatch&) = delete;
 
     /// Takes in a connection, which has to be admitted before the library gets it. Ends another for it when a
-    /// limit is reached: the oldest that has not logged in, of the network with the most such; if there is
-    /// none, one of the user with the most connections, where that is more than a quarter. A part of the
-    /// limit is kept for networks from which somebody has logged in. Waits while the threads of many ended
+    /// limit is reached: the oldest that has not logged in, of the networks from which nobody has and which
+    /// have the most such; if there is none, one of the user with the most connections, where that is more
+    /// than a quarter; else the oldest that has not logged in of any network. A part of the limit is kept for
+    /// networks from which somebody has logged in. Waits while the threads of many ended
     /// ones still end. Returns the connection's number; nothing when it is refused, or asked to stop.
     /// @param network  what networkOf() says; kLocalAddress for the Unix socket
     std::optional<std::uint64_t> admit(int socket, const std::string& network, const std::stop_token& stop);

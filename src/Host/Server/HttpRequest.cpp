@@ -146,6 +146,21 @@ std::optional<HttpAnswer> HttpRequest::authenticate() {
     return std::nullopt;
 }
 
+std::string HttpRequest::quotaName() const {
+    // Root on the spot has places of his own; no user of the network has a colon in his name.
+    return isLocal() ? "unix:" + m_user.name : m_user.name;
+}
+
+std::optional<HttpAnswer> HttpRequest::chargeBody() {
+    m_bodyCharge.emplace(m_server.m_dispatcher.charge(quotaName()));
+    try {
+        m_bodyCharge->set(*contentLengthOf(m_head));
+    } catch (const OverBudget&) {
+        return HttpAnswer::withHeader(503, "Retry-After", "10");
+    }
+    return std::nullopt;
+}
+
 void HttpRequest::goOn() {
     m_server.m_watch->allow(m_socket, m_server.m_limits.requestTime);
     // The library has gone on counting how long nothing moved. It counts anew from where there was no limit.
@@ -157,6 +172,7 @@ MHD_Result HttpRequest::begin() {
     // If a client may not send its body, it is told before it sends a megabyte.
     m_refusal = checkHead(m_head, m_server.m_limits.bodyBytes);
     if (!m_refusal) m_refusal = authenticate();
+    if (!m_refusal) m_refusal = chargeBody();
     // A user who has been removed must not keep his place by requests that are refused.
     if (m_refusal) m_server.m_watch->loggedOut(m_socket);
     goOn();
@@ -179,17 +195,18 @@ void HttpRequest::take(const char* data, std::size_t size) {
 
 HttpAnswer HttpRequest::carryOut() {
     // From here on the time is ours: an operation may read an image of many megabytes.
-    m_server.m_watch->suspend(m_socket);
-    // Root on the spot has places of his own; no user of the network has a colon in his name.
-    const std::string user = isLocal() ? "unix:" + m_user.name : m_user.name;
-    const HeldUserSlot own(m_server.m_userSlots, user, m_server.m_limits.requestTime);
+    const std::stop_token ended = m_server.m_watch->suspend(m_socket);
+    const std::string user = quotaName();
+    const HeldUserSlot own(m_server.m_userSlots, user, m_server.m_limits.requestTime, ended);
     if (!own) return HttpAnswer::withHeader(503, "Retry-After", "10");
     Slots& workers = isLocal() ? m_server.m_localWorkers : m_server.m_workers;
-    const HeldSlot worker(workers, m_server.m_limits.requestTime);
+    const HeldSlot worker(workers, m_server.m_limits.requestTime, ended);
     if (!worker) return HttpAnswer::withHeader(503, "Retry-After", "10");
     AnswerCharge charge = m_server.m_dispatcher.charge(user);
     try {
         const cimxml::Request request = cimxml::readRequest(m_body);
+        std::string().swap(m_body);
+        m_bodyCharge.reset();
         cimxml::checkHeadersAgainst(m_head.cim, request);
         QUENX_DEBUG("%s of %s from %s", utils::escapeForFormat(request.name()).c_str(),
                     utils::escapeForFormat(m_user.name).c_str(), m_head.address.c_str());

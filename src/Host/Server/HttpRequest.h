@@ -79,6 +79,9 @@ class HttpRequest {
   private:
     bool isLocal() const;
     std::optional<HttpAnswer> authenticate();
+    /// Under which the user's share of slots and of the budget is counted.
+    std::string quotaName() const;
+    std::optional<HttpAnswer> chargeBody();
     HttpAnswer carryOut();
     /// The client's time runs again, after it has had to wait for us.
     void goOn();
@@ -92,6 +95,7 @@ class HttpRequest {
     User m_user;
     std::optional<HttpAnswer> m_refusal;  ///< waits for the body to be read
     std::string m_body;
+    std::optional<AnswerCharge> m_bodyCharge;  ///< large bodies share the budget of the answers
     bool m_mustDrain = false;
 };
 

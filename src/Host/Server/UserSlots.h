@@ -5,6 +5,7 @@
 #include <condition_variable>
 #include <map>
 #include <mutex>
+#include <stop_token>
 #include <string>
 
 namespace host {
@@ -19,18 +20,19 @@ class UserSlots {
     friend class HeldUserSlot;
     const unsigned int m_perUser;
     std::mutex m_mutex;
-    std::condition_variable m_released;
+    std::condition_variable_any m_released;
     std::map<std::string, unsigned int> m_held;
 };
 
-/// One of the user's slots, held for the scope; false when none came free in time.
+/// One of the user's slots, held for the scope; false when none came free in time, or the wait was stopped.
 class HeldUserSlot {
   public:
-    HeldUserSlot(UserSlots& slots, std::string user, std::chrono::milliseconds patience)
+    HeldUserSlot(UserSlots& slots, std::string user, std::chrono::milliseconds patience,
+                 const std::stop_token& stop = {})
         : m_slots(slots), m_user(std::move(user)) {
         std::unique_lock lock(m_slots.m_mutex);
         const auto isFree = [this] { return m_slots.m_held[m_user] < m_slots.m_perUser; };
-        m_isHeld = m_slots.m_released.wait_for(lock, patience, isFree);
+        m_isHeld = m_slots.m_released.wait_for(lock, stop, patience, isFree);
         if (m_isHeld) ++m_slots.m_held[m_user];
     }
     ~HeldUserSlot() {
