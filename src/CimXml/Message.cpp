@@ -1,4 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
+#include <new>
+
 #include "CimXml/ElementCodec.h"
 
 #include "CimXml/WireError.h"
@@ -7,6 +9,8 @@ namespace cimxml {
 
 namespace {
 
+constexpr std::size_t kLongestMessageId = 1024;
+
 void parseDocument(pugi::xml_document& document, std::string_view bytes) {
     checkWellFormed(bytes);
     // Blanks count inside VALUE, so none are dropped here; readers pass over those between elements.
@@ -14,6 +18,8 @@ void parseDocument(pugi::xml_document& document, std::string_view bytes) {
                                       pugi::parse_wconv_attribute | pugi::parse_ws_pcdata;
     const pugi::xml_parse_result result =
         document.load_buffer(bytes.data(), bytes.size(), kOptions, pugi::encoding_utf8);
+    // Says nothing of the document: asked again later, it may be read.
+    if (result.status == pugi::status_out_of_memory) throw std::bad_alloc();
     if (!result) throw WireError(faults::kNotWellFormed, result.description());
 }
 
@@ -51,6 +57,9 @@ Envelope openEnvelope(pugi::xml_document& document, std::string_view bytes, std:
     expectElement(message, "MESSAGE");
     Envelope envelope;
     envelope.messageId = requiredAttribute(message, "ID");
+    // The answer repeats it, escaped, and nobody's budget knows of it beforehand.
+    if (envelope.messageId.size() > kLongestMessageId)
+        throw WireError(faults::kNotValid, "the ID of MESSAGE is longer than 1024 bytes");
     checkVersion(message, "PROTOCOLVERSION", "1.", faults::kUnsupportedProtocol);
     const pugi::xml_node wrapped = onlyChild(message);
     // Refused by its own name, so that a client that can batch falls back to single requests.

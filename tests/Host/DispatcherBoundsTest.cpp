@@ -18,6 +18,20 @@ TEST_F(DispatcherTest, GivesWhatItHasTakenOutOfAnEnumeration) {
               43U);
 }
 
+TEST_F(DispatcherTest, RepeatsNoLongTextOfTheRequest) {
+    const std::string quotes(200000, '"');
+    for (const char* space : {"root/cimv2", "root/other"}) {
+        CimPath path("test_gadget", {{"number", "1"}, {"id", quotes}});
+        path.setNamespace(space);
+        EXPECT_LT(description(send("GetInstance", {{"InstanceName", path}})).size(), 500U) << space;
+    }
+    std::string umlauts = "x";
+    for (int i = 0; i < 3000; ++i)
+        umlauts += "\u00e4";
+    const auto unknown = send("EnumerateInstances", {{"ClassName", ClassName{umlauts}}});
+    EXPECT_EQ(description(unknown).size(), 1999U) << "half a character would end the answer";
+}
+
 TEST_F(DispatcherTest, CarriesOutNothingForAnotherNamespace) {
     CimPath elsewhere = gadget("a", "1");
     elsewhere.setNamespace("root/other");

@@ -75,6 +75,10 @@ class DispatcherTest : public ::testing::Test {
         return static_cast<int>(failure->status);
     }
 
+    static std::string description(const cimxml::Response& response) {
+        return std::get<cimxml::ErrorResult>(response.content).description;
+    }
+
     int status(const std::string& operation, Given parameters) {
         return statusIn(send(operation, std::move(parameters)));
     }

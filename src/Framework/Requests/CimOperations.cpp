@@ -6,6 +6,7 @@
 
 #include "Framework/Model/CimInstance.h"
 #include "Framework/Model/CimProperty.h"
+#include "Framework/Requests/AnswerMeter.h"
 #include "Utils/Utils.h"
 
 namespace core {
@@ -177,9 +178,15 @@ InstanceValue readInstance(CimInstance& instance, CimPath path, const WantedProp
     return result;
 }
 
+std::string shownPath(const CimPath& path) {
+    constexpr std::size_t kMost = 4096;
+    const std::size_t bytes = bytesOf(path);
+    return bytes <= kMost ? path.toString() : "a path of " + std::to_string(bytes) + " bytes";
+}
+
 CimPath typedPath(const CimPath& path, const ClassLookup& classes) {
     if (!path.isValid()) {
-        refuse("'" + path.toString() + "' is not an object path; write one as namespace:Class.Key=\"value\"");
+        refuse("'" + shownPath(path) + "' is not an object path; write one as namespace:Class.Key=\"value\"");
     }
     const ClassChain chain = classes(path.getClassName());
     if (chain.empty()) {

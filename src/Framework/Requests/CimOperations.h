@@ -150,6 +150,9 @@ using ClassLookup = std::function<ClassChain(const std::string&)>;
 /// parameter when the keys are not exactly those of the class or a text does not read as its key's type.
 QUENX_EXPORT CimPath typedPath(const CimPath& path, const ClassLookup& classes);
 
+/// The path for a message; of one that is longer than anybody reads, how long it is.
+QUENX_EXPORT std::string shownPath(const CimPath& path);
+
 /// The arguments with their declared names and types; references in them as typedPath() makes them, where
 /// they fit. CimError (invalid parameter) for one that the method does not declare or that comes twice, and
 /// for a value of another kind than declared. Integers may come in any width that holds the value.

@@ -144,7 +144,7 @@ void CimRequests::deleteInstance(const CimPath& path) {
                                                   std::to_string(code));
         }
         // Of a class without deletion a client learns first whether the instance is there at all.
-        if (isSupported) throw CimError(CimStatus::NotFound, typed.toString() + " names no instance");
+        if (isSupported) throw CimError(CimStatus::NotFound, shownPath(typed) + " names no instance");
         classes.requireInstance(typed);
         throw CimError(CimStatus::NotSupported,
                        "instances of " + typed.getClassName() + " cannot be deleted");

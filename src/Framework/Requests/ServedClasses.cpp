@@ -67,7 +67,7 @@ CimPath ServedClasses::typed(const CimPath& path) const {
 
 CimInstance& ServedClasses::requireInstance(CimPath& path) const {
     if (CimInstance* instance = GetCimBroker()->getInstanceByPath(path)) return *instance;
-    throw CimError(CimStatus::NotFound, path.toString() + " names no instance");
+    throw CimError(CimStatus::NotFound, shownPath(path) + " names no instance");
 }
 
 }  // namespace core

@@ -21,11 +21,24 @@ void requirePrivilege(Privilege privilege, const Caller& caller) {
     }
 }
 
+/// What an error says, as far as anybody reads it: some repeat names of the request, which may be a megabyte
+/// long.
+std::string shownText(const std::exception& error) {
+    constexpr std::size_t kMost = 2000;
+    const std::string_view whole = error.what();
+    std::size_t shown = std::min(whole.size(), kMost);
+    // Never half a character, which would make the answer unreadable.
+    while (shown > 0 && shown < whole.size() && (whole[shown] & 0xC0) == 0x80)
+        --shown;
+    return std::string(whole.substr(0, shown));
+}
+
 /// Refuses the path of another namespace: its keys may name something here as well, which is not what the
 /// client means, nor what the audit trail would say.
 void requireHere(const core::CimPath& path, const std::string& namespaceName, CimStatus otherwise) {
     if (core::sameName(path.getNamespace(), namespaceName)) return;
-    throw CimError(otherwise, path.toString() + " names nothing in namespace \"" + namespaceName + "\"");
+    throw CimError(otherwise,
+                   core::shownPath(path) + " names nothing in namespace \"" + namespaceName + "\"");
 }
 
 /// Whether the call changes something, or would. No method is known to change nothing: a check claims its
@@ -150,7 +163,7 @@ cimxml::Response Dispatcher::carryOut(const cimxml::Request& request, const Call
             response.content = callOperation(std::get<cimxml::IntrinsicCall>(request.call), caller, charge);
         }
     } catch (const CimError& error) {
-        response.content = ErrorResult{error.status(), error.what()};
+        response.content = ErrorResult{error.status(), shownText(error)};
     } catch (const OverBudget&) {
         // Those that nobody reads on are let go of by the way, and nobody may come by if all are refused
         // here.
@@ -161,7 +174,7 @@ cimxml::Response Dispatcher::carryOut(const cimxml::Request& request, const Call
         response.content = ErrorResult{CimStatus::Failed, "out of memory"};
     } catch (const std::exception& error) {
         // A provider's fault is the answer to this request alone; the connection and the daemon go on.
-        response.content = ErrorResult{CimStatus::Failed, error.what()};
+        response.content = ErrorResult{CimStatus::Failed, shownText(error)};
     }
     return response;
 }

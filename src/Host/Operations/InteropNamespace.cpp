@@ -120,7 +120,7 @@ InstanceValue InteropNamespace::getInstance(const CimPath& path, const core::Pro
     for (const InstanceValue& own : m_model.instances) {
         if (own.path.isSameObjectAs(typed)) return filtered(own, filter);
     }
-    throw core::CimError(core::CimStatus::NotFound, path.toString() + " names no instance");
+    throw core::CimError(core::CimStatus::NotFound, core::shownPath(path) + " names no instance");
 }
 
 bool InteropNamespace::hasAssociations(const CimPath& path, const core::AssociationFilter& by) const {

@@ -139,7 +139,7 @@ IntrinsicResult OpenEnumerations::pull(const EnumerationOwner& owner, cimxml::Re
     IntrinsicResult part = takeNext(found->second.rest, count);
     found->second.charge.moveTo(charge, bytesOf(part));
     // Refused now, these objects would be in no answer: whoever asks again gets the next ones.
-    charge.owe();
+    if (!isEmpty(part)) charge.owe();
     const bool ended = isEmpty(found->second.rest);
     addOutputs(part, ended, ended ? "" : context);
     if (ended) {
