@@ -3,11 +3,11 @@
 
 #include <cstdint>
 #include <memory>
-#include <stdexcept>
 #include <string>
 #include <vector>
 
 #include "MidAPI/AdapterTypes.h"
+#include "MidAPI/OperationFailure.h"
 #include "Utils/Os/Linux/Mutex.h"
 
 namespace ma {
@@ -41,17 +41,6 @@ struct Fault {
     std::string text{};
     std::uint32_t milliseconds = 0;
     bool once = false;  ///< strikes one time only, instead of at every such operation
-};
-
-/// An operation failed, because it was refused or because of a fault of Action::Fail: how code and text
-/// travel inside the simulator.
-class OperationFailure : public std::runtime_error {
-  public:
-    OperationFailure(std::uint32_t code, const std::string& text) : std::runtime_error(text), m_code(code) {}
-    std::uint32_t code() const { return m_code; }
-
-  private:
-    std::uint32_t m_code;
 };
 
 /// The faults of one adapter. Thread-safe.

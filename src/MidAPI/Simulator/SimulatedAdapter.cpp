@@ -8,6 +8,7 @@
 
 #include "MidAPI/Image/ImagePreparation.h"
 #include "MidAPI/Image/OptionRom.h"
+#include "MidAPI/OperationFailure.h"
 #include "Utils/Log.h"
 #include "Utils/Os/Linux/linux.h"
 #include "Utils/Utils.h"
@@ -86,27 +87,6 @@ FlashStore makeStore(const AdapterDescription& description, const std::string& s
     const FlashState state = factoryState(description, flash);
     return FlashStore(stateDirectory + "/" + folderName(description.name), std::move(flash), state,
                       std::move(files));
-}
-
-/// Runs an operation and turns what it throws into the API's code and text. AdapterError, which faults throw,
-/// passes through.
-template <typename Action>
-bool runReporting(const std::string& adapter, std::uint32_t& errorCode, std::string& errorText,
-                  Action action) {
-    errorCode = WriteError::NoError;
-    errorText.clear();
-    try {
-        action();
-        return true;
-    } catch (const OperationFailure& failure) {
-        errorCode = failure.code();
-        errorText = failure.what();
-    } catch (const std::runtime_error& error) {
-        errorCode = WriteError::DeviceFailed;
-        errorText = error.what();
-    }
-    QUENX_ERROR("adapter %s: %s", adapter.c_str(), errorText.c_str());
-    return false;
 }
 
 /// Holds a writer back to the adapter's speed.

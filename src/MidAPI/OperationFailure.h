@@ -1,0 +1,44 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include <cstdint>
+#include <stdexcept>
+#include <string>
+
+#include "MidAPI/AdapterTypes.h"
+#include "Utils/Log.h"
+
+namespace ma {
+
+/// An operation failed, or was refused: how code and text travel inside a backend.
+class OperationFailure : public std::runtime_error {
+  public:
+    OperationFailure(std::uint32_t code, const std::string& text) : std::runtime_error(text), m_code(code) {}
+    std::uint32_t code() const { return m_code; }
+
+  private:
+    std::uint32_t m_code;
+};
+
+/// Runs an operation and turns what it throws into the adapter API's code and text. The log has
+/// it, too. AdapterError passes through.
+template <typename Action>
+bool runReporting(const std::string& adapter, std::uint32_t& errorCode, std::string& errorText,
+                  Action action) {
+    errorCode = WriteError::NoError;
+    errorText.clear();
+    try {
+        action();
+        return true;
+    } catch (const OperationFailure& failure) {
+        errorCode = failure.code();
+        errorText = failure.what();
+    } catch (const std::runtime_error& error) {
+        errorCode = WriteError::DeviceFailed;
+        errorText = error.what();
+    }
+    QUENX_ERROR("adapter %s: %s", adapter.c_str(), errorText.c_str());
+    return false;
+}
+
+}  // namespace ma
