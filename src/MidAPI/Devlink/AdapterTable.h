@@ -1,0 +1,92 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include <map>
+#include <memory>
+#include <optional>
+#include <string>
+#include <vector>
+
+#include "MidAPI/Devlink/DeviceRequests.h"
+#include "MidAPI/Devlink/Machine.h"
+#include "MidAPI/Devlink/PciFunctions.h"
+#include "MidAPI/Progress.h"
+#include "Utils/Export.h"
+#include "Utils/Os/Linux/Mutex.h"
+#include "Utils/StringArray.h"
+
+namespace ma::devlink {
+
+/// What is known of one PCI function.
+struct KnownFunction {
+    PciFunction pci;
+    FlashVerdict flash;  ///< Flashable::Unknown also until the device could be asked
+    DeviceInfo info;
+    bool isBusy = false;  ///< it is being flashed, by this process or another one
+    std::shared_ptr<Progress> progress = std::make_shared<Progress>();  ///< never null
+};
+
+/// What is known of the machine's Ethernet functions. Kept in memory, because a device that is being flashed
+/// answers nothing until that is over, minutes later: it is asked when it is first looked at and after
+/// whatever changed it, but never while it is known to be flashed. Any thread may call.
+class QUENX_EXPORT AdapterTable {
+  public:
+    /// @param lockFolder  where the locks of the cards are, see CardLock
+    AdapterTable(std::shared_ptr<Machine> machine, std::string lockFolder);
+
+    /// The names of the functions that the machine has now, by ascending address.
+    utils::StringArray names();
+
+    /// What is known of a function; nothing for an unknown name. Asks the device where that is out of date
+    /// and does not wait.
+    std::optional<KnownFunction> find(const std::string& name);
+    /// The same from memory alone: for what is asked again and again during an update.
+    std::shared_ptr<Progress> progressOf(const std::string& name);
+
+    /// Takes note of what the kernel has told meanwhile, so that it does not get too much for its buffer.
+    void readNotifications() noexcept;
+
+    /// Says that this process is flashing a function, for as long as it lives.
+    class QUENX_EXPORT FlashScope {
+      public:
+        FlashScope(AdapterTable& table, std::string name);
+        FlashScope(const FlashScope&) = delete;
+        FlashScope& operator=(const FlashScope&) = delete;
+        ~FlashScope();
+
+      private:
+        AdapterTable& m_table;
+        const std::string m_name;
+    };
+
+  private:
+    struct Entry {
+        KnownFunction known;
+        bool isOutOfDate = true;
+        bool isFlashedElsewhere = false;  ///< as far as the kernel has told
+        int ownFlashes = 0;
+        unsigned int changes = 0;  ///< how often something was told that makes it out of date
+    };
+    struct Found {
+        KnownFunction known;
+        bool mustBeAsked = false;
+        unsigned int changes = 0;
+    };
+
+    std::optional<Found> look(const std::string& name);
+    std::vector<PciFunction> walk();
+    void ask(const std::string& name, const Found& found);
+    void askDevice(KnownFunction& known);
+    void listen(const Family& family);
+    bool isLockedElsewhere(const PciFunction& function);
+    void note(const Notifications::Batch& batch) QUENX_REQUIRES(m_mutex);
+    static void outdate(Entry& entry);
+
+    const std::shared_ptr<Machine> m_machine;
+    const std::string m_lockFolder;
+    utils::Mutex m_mutex;  ///< never held over a request
+    std::map<std::string, Entry> m_entries QUENX_GUARDED_BY(m_mutex);
+    std::unique_ptr<Notifications> m_notifications QUENX_GUARDED_BY(m_mutex);
+};
+
+}  // namespace ma::devlink

@@ -1,0 +1,221 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "MidAPI/Devlink/DevlinkBackend.h"
+
+#include <algorithm>
+#include <cerrno>
+#include <system_error>
+
+#include "MidAPI/Devlink/CardLock.h"
+#include "MidAPI/Devlink/DeviceRequests.h"
+#include "MidAPI/Devlink/FlashRun.h"
+#include "MidAPI/Devlink/StagedImage.h"
+#include "MidAPI/Image/Bytes.h"
+#include "MidAPI/Image/ImagePreparation.h"
+#include "MidAPI/OperationFailure.h"
+#include "Utils/Log.h"
+
+namespace ma::devlink {
+namespace {
+
+// The packages' state folder, where a hardened daemon may write, too.
+constexpr const char* kLockFolder = "/var/lib/quenx/locks";
+constexpr std::chrono::milliseconds kLockPatience{3000};
+
+std::string unknown(const std::string& adapter) {
+    return "there is no adapter " + adapter;
+}
+
+/// Whether no process could flash it, whatever its rights.
+bool canNeverBeUpdated(const FlashVerdict& flash) {
+    return flash.flashable == Flashable::NotOffered || flash.flashable == Flashable::Absent;
+}
+
+/// An answer that a file cannot change.
+void requireFlashable(const FlashVerdict& flash) {
+    if (canNeverBeUpdated(flash))
+        throw OperationFailure(WriteError::NotUpdatable, "this adapter cannot be updated: " + flash.reason);
+    if (flash.flashable == Flashable::NotPermitted)
+        throw OperationFailure(EPERM, "this process may not update the adapter: " + flash.reason);
+    if (flash.flashable == Flashable::Unknown)
+        throw OperationFailure(WriteError::DeviceFailed,
+                               "the adapter cannot be asked" +
+                                   (flash.reason.empty() ? "; it is busy, try again" : ": " + flash.reason));
+}
+
+/// A firmware that is in the flash and does not run yet. Only a try would tell what it takes to make it run.
+ResetNeeded resetNeeded(const DeviceInfo& info) {
+    return std::ranges::any_of(info.versions, &NamedVersion::isPending) ? ResetNeeded::Unknown
+                                                                        : ResetNeeded::None;
+}
+
+}  // namespace
+
+DevlinkBackend::DevlinkBackend(Settings settings, std::shared_ptr<Machine> machine)
+    : m_settings(std::move(settings)), m_machine(std::move(machine)), m_table(m_machine, kLockFolder) {}
+
+DevlinkBackend::~DevlinkBackend() = default;
+
+KnownFunction DevlinkBackend::require(const std::string& adapter) {
+    if (auto known = m_table.find(adapter)) return *std::move(known);
+    throw AdapterError(unknown(adapter));
+}
+
+utils::StringArray DevlinkBackend::enumerateAdapters() {
+    return m_table.names();
+}
+
+utils::PCIAddr DevlinkBackend::getPCIAddress(const std::string& adapter) {
+    return parseFunctionAddress(require(adapter).pci.address).value_or(utils::PCIAddr());
+}
+
+bool DevlinkBackend::getCanBeUpdated(const std::string& adapter) {
+    const auto known = m_table.find(adapter);
+    return known && known->flash.flashable == Flashable::Yes;
+}
+
+bool DevlinkBackend::getAdapterFirmwareVersion(const std::string& adapter,
+                                               std::vector<utils::FirmwareVersionInfo>& components) {
+    const auto known = m_table.find(adapter);
+    if (known) components = m_settings.components.installed(known->info.versions);
+    return known.has_value();
+}
+
+int DevlinkBackend::prepareFlashImage(const std::string& adapter, const std::uint8_t* file,
+                                      std::uint32_t fileSize, std::uint8_t* output, std::uint32_t* imageSize,
+                                      std::vector<utils::FirmwareType>& types) try {
+    const auto known = m_table.find(adapter);
+    const bool buffersMissing = fileSize != 0 && (file == nullptr || output == nullptr);
+    if (!known || buffersMissing || imageSize == nullptr || *imageSize < fileSize) {
+        QUENX_ERROR("adapter %s: status %d: %s", adapter.c_str(), PrepareStatus::InvalidParameter,
+                    known ? "a buffer is missing or too small" : "there is no such adapter");
+        return PrepareStatus::InvalidParameter;
+    }
+    known->progress->prepared();
+    const std::span<const std::uint8_t> bytes(file, fileSize);
+    const PackageVerdict verdict = assess(*known, bytes, types);
+    if (!verdict.reason.empty())
+        QUENX_ERROR("adapter %s: status %d: %s", adapter.c_str(), verdict.status, verdict.reason.c_str());
+    if (!hasOutput(verdict.status)) return verdict.status;
+    std::copy(bytes.begin(), bytes.end(), output);
+    *imageSize = fileSize;
+    types = verdict.types;
+    const utils::Mutex::AutoLocker lock(m_preparedMutex);
+    m_prepared[adapter] = {fileSize, crc32(bytes), verdict.components};
+    return verdict.status;
+} catch (const std::exception& error) {
+    QUENX_ERROR("adapter %s: status %d: %s", adapter.c_str(), PrepareStatus::UnspecifiedError, error.what());
+    return PrepareStatus::UnspecifiedError;
+}
+
+PackageVerdict DevlinkBackend::assess(const KnownFunction& known, std::span<const std::uint8_t> file,
+                                      const std::vector<utils::FirmwareType>& types) {
+    const PackageTarget target{
+        .ids = known.pci.ids,
+        .canBeUpdated = !canNeverBeUpdated(known.flash),
+        .versions = known.info.versions,
+        .largestImage = m_settings.largestImage,
+        .table = m_settings.components,
+        .accepts = [&](const std::string& component) { return accepts(known, component); }};
+    PackageVerdict verdict = assessPackage(target, file, types);
+    if (!hasOutput(verdict.status)) return verdict;
+    // What is wrong with the file comes first: another one is needed whoever writes it.
+    requireFlashable(known.flash);
+    stagingFolder();
+    for (const std::string& unchecked : verdict.unchecked)
+        QUENX_DEBUG("adapter %s: it could not be checked %s", known.pci.address.c_str(), unchecked.c_str());
+    return verdict;
+}
+
+bool DevlinkBackend::accepts(const KnownFunction& known, const std::string& component) {
+    requireFlashable(known.flash);
+    // The question would wait for the end of a flash.
+    if (known.isBusy)
+        throw OperationFailure(WriteError::Busy, "the adapter is being updated; wait until it is done");
+    DevlinkConnection connection(*m_machine);
+    return refusalOfComponent(connection, known.pci.address, component).empty();
+}
+
+bool DevlinkBackend::writeFlashImage(const std::string& adapter, const std::uint8_t* image,
+                                     std::uint32_t imageSize, std::uint32_t& errorCode,
+                                     std::string& errorText) {
+    return runReporting(adapter, errorCode, errorText, [&] {
+        write(adapter, {image, image == nullptr ? 0 : imageSize});
+    });
+}
+
+void DevlinkBackend::write(const std::string& adapter, std::span<const std::uint8_t> image) {
+    const auto known = m_table.find(adapter);
+    if (!known) throw OperationFailure(WriteError::UnknownAdapter, unknown(adapter));
+    FlashOrder order{*known, "", image, preparedComponents(adapter, image)};
+    // Said before the lock is tried, which takes rights of its own.
+    if (known->flash.flashable != Flashable::Unknown) requireFlashable(known->flash);
+    const CardLock lock(*m_machine, kLockFolder, known->pci, known->info, kLockPatience);
+    if (!lock.isHeld())
+        throw OperationFailure(WriteError::Busy, "the card of adapter " + adapter +
+                                                     " is being written to by " + lock.holder() +
+                                                     "; wait until it is done");
+    requireFlashable(known->flash);
+    order.folder = stagingFolder();
+    const AdapterTable::FlashScope flashing(m_table, adapter);
+    const WritingScope writing(*known->progress);
+    runFlash(*m_machine, order, [this] { m_table.readNotifications(); });
+}
+
+std::string DevlinkBackend::stagingFolder() try {
+    return chooseFirmwareFolder(*m_machine, m_settings.firmwareFolder);
+} catch (const AdapterError& error) {
+    throw OperationFailure(EACCES, error.what());
+}
+
+std::vector<std::string> DevlinkBackend::preparedComponents(const std::string& adapter,
+                                                            std::span<const std::uint8_t> image) {
+    const std::uint32_t checksum = crc32(image);
+    const utils::Mutex::AutoLocker lock(m_preparedMutex);
+    const auto found = m_prepared.find(adapter);
+    if (found == m_prepared.end() || found->second.size != image.size() || found->second.checksum != checksum)
+        throw OperationFailure(WriteError::BadImage,
+                               "this image was not prepared for adapter " + adapter + "; prepare it first");
+    return found->second.components;
+}
+
+bool DevlinkBackend::updateCapabilityWord(const std::string& adapter, const std::vector<utils::FirmwareType>&,
+                                          std::uint32_t& errorCode, std::string& errorText) {
+    return runReporting(adapter, errorCode, errorText, [&] {
+        const auto known = m_table.find(adapter);
+        if (!known || known->flash.flashable == Flashable::Absent)
+            throw OperationFailure(ENODEV, "adapter " + adapter + " is gone");
+    });
+}
+
+std::uint16_t DevlinkBackend::getFlashImageUpdateProgress(const std::string& adapter) {
+    const auto progress = m_table.progressOf(adapter);
+    return progress ? progress->percent() : std::uint16_t{0};
+}
+
+bool DevlinkBackend::setBootType(const std::string& adapter, BootType type) {
+    QUENX_DEBUG("adapter %s: boot type %d is not set: devlink knows no boot types", adapter.c_str(),
+                static_cast<int>(type));
+    return false;
+}
+
+AdapterInfo DevlinkBackend::getAdapterInfo(const std::string& adapter) {
+    const KnownFunction known = require(adapter);
+    const InterfaceState state = readInterfaceState(*m_machine, known.pci);
+    AdapterInfo info;
+    info.permanentMac = state.mac;
+    info.speed = state.speed;
+    info.linkUp = state.linkUp;
+    info.ids = known.pci.ids;
+    info.components = m_settings.components.installed(known.info.versions);
+    info.backend = "devlink";
+    info.driver = known.pci.driver;
+    info.serialNumber = known.info.serialNumber;
+    info.boardSerialNumber = known.info.boardSerialNumber;
+    info.versions = known.info.versions;
+    info.resetNeeded = resetNeeded(known.info);
+    info.interfaces = known.pci.interfaces;
+    info.description = "Ethernet adapter " + known.pci.address;
+    return info;
+}
+
+}  // namespace ma::devlink

@@ -1,0 +1,174 @@
+// SPDX-License-Identifier: Apache-2.0
+#include <gmock/gmock.h>
+#include <linux/devlink.h>
+
+#include <cerrno>
+
+#include "MidAPI/Devlink/DevlinkBench.h"
+#include "Support/SyslogCapture.h"
+#include "Support/Together.h"
+
+namespace {
+
+using testing::ElementsAre;
+
+std::string runningVersion(const std::string& adapter) {
+    const ma::AdapterInfo info = ma::getAdapterInfo(adapter);
+    return info.versions.empty() ? "" : info.versions.front().running;
+}
+
+TEST(DevlinkInventoryTest, TellsWhatKernelAndDriverTell) {
+    const test::DevlinkBench bench;
+    bench.device().serial = "AB12";
+    bench.device().boardSerial = "CD34";
+    bench.device().stored["fw"] = "1.3.0";
+    bench.kernel->files["/sys/class/net/enp5s0f0/address"] = "52:54:00:12:34:56";
+    EXPECT_THAT(ma::enumerateAdapters(), ElementsAre(bench.first, bench.second));
+    EXPECT_EQ((utils::PCIAddr{5, 0, 1, false, bench.second}), ma::getPCIAddress(bench.second));
+    const ma::AdapterInfo info = ma::getAdapterInfo(bench.first);
+    EXPECT_EQ("devlink", info.backend);
+    EXPECT_EQ("fake", info.driver);
+    EXPECT_EQ("AB12", info.serialNumber);
+    EXPECT_EQ("CD34", info.boardSerialNumber);
+    EXPECT_EQ(0x56, info.permanentMac[5]);
+    EXPECT_THAT(info.interfaces, ElementsAre("enp5s0f0"));
+    EXPECT_THAT(info.versions, ElementsAre(ma::NamedVersion{"fw", "", "1.2.3", "1.3.0"}));
+    EXPECT_EQ(ma::ResetNeeded::Unknown, info.resetNeeded);
+    EXPECT_EQ(ma::ResetNeeded::None, ma::getAdapterInfo(bench.second).resetNeeded);
+
+    std::vector<utils::FirmwareVersionInfo> components;
+    EXPECT_TRUE(ma::getAdapterFirmwareVersion(bench.first, components));
+    ASSERT_EQ(1U, components.size());
+    EXPECT_EQ(0x01020300U, components[0].version);
+    EXPECT_FALSE(ma::getAdapterFirmwareVersion("eth0", components));
+    EXPECT_THROW(ma::getAdapterInfo("eth0"), ma::AdapterError);
+    EXPECT_THROW(ma::getPCIAddress("eth0"), ma::AdapterError);
+    EXPECT_FALSE(ma::setBootType(bench.first, ma::BootType::None));
+}
+
+TEST(DevlinkInventoryTest, SaysWhatCanBeUpdatedAndPreparesNothingElse) {
+    struct Case {
+        std::function<void(test::FakeKernel&, test::FakeDevice&)> arrange;
+        bool canBeUpdated;
+        int status;
+        std::string log;
+    };
+    const std::vector<Case> cases = {
+        {[](auto&, auto&) {}, true, ma::PrepareStatus::Prepared, ""},
+        {[](auto&, auto& device) { device.hasInfo = false; }, true, ma::PrepareStatus::Prepared, ""},
+        {[](auto&, auto& device) { device.hasFlash = false; }, false, ma::PrepareStatus::ImageNotSupported,
+         ""},
+        {[](auto& kernel, auto&) { kernel.devices.clear(); }, false, ma::PrepareStatus::ImageNotSupported,
+         ""},
+        {[](auto& kernel, auto&) { kernel.hasDevlink = false; }, false, ma::PrepareStatus::ImageNotSupported,
+         ""},
+        {[](auto& kernel, auto&) { kernel.isPermitted = false; }, false, ma::PrepareStatus::UnspecifiedError,
+         "run it as root"},
+        {[](auto& kernel, auto&) { kernel.failures["openNetlink"] = EAFNOSUPPORT; }, false,
+         ma::PrepareStatus::UnspecifiedError, "Address family not supported"},
+        {[](auto& kernel, auto&) { kernel.failures["send"] = ENOBUFS; }, false,
+         ma::PrepareStatus::UnspecifiedError, "No buffer space"},
+        {[](auto& kernel, auto&) { kernel.mangle = [](test::Datagram& datagram) { datagram.resize(1); }; },
+         false, ma::PrepareStatus::UnspecifiedError, "does not say whether it has devlink"},
+        {[](auto& kernel, auto&) { kernel.readOnly.insert("/lib/firmware"); }, true,
+         ma::PrepareStatus::UnspecifiedError, "/lib/firmware"},
+    };
+    for (const Case& each : cases) {
+        const test::SyslogCapture log;
+        const test::DevlinkBench bench;
+        each.arrange(*bench.kernel, bench.device());
+        EXPECT_EQ(each.canBeUpdated, ma::getCanBeUpdated(bench.first)) << each.log;
+        EXPECT_EQ(each.status, bench.prepare()) << each.log;
+        EXPECT_TRUE(each.log.empty() || log.contains(each.log)) << each.log;
+        EXPECT_EQ(2U, ma::enumerateAdapters().size()) << each.log;
+    }
+}
+
+TEST(DevlinkInventoryTest, AsksADeviceOnceUntilItChanges) {
+    const test::DevlinkBench bench;
+    EXPECT_EQ("1.2.3", runningVersion(bench.first));
+    const int asked = bench.kernel->requests;
+    EXPECT_TRUE(ma::getCanBeUpdated(bench.first));
+    EXPECT_EQ("1.2.3", runningVersion(bench.first));
+    EXPECT_EQ(asked, bench.kernel->requests);
+
+    bench.device().running["fw"] = "1.3.0";
+    bench.kernel->notify(DEVLINK_CMD_NEW, bench.second);
+    EXPECT_EQ("1.2.3", runningVersion(bench.first)) << "told of another one";
+    bench.kernel->notify(DEVLINK_CMD_NEW, bench.first);
+    EXPECT_EQ("1.3.0", runningVersion(bench.first));
+    const test::FakeDevice gone = bench.device();
+    bench.kernel->devices.erase(bench.first);
+    bench.kernel->notify(DEVLINK_CMD_DEL, bench.first);
+    EXPECT_FALSE(ma::getCanBeUpdated(bench.first));
+    EXPECT_EQ("", runningVersion(bench.first));
+    bench.kernel->devices[bench.first] = gone;
+    bench.kernel->notify(DEVLINK_CMD_NEW, bench.first);
+    EXPECT_TRUE(ma::getCanBeUpdated(bench.first));
+
+    bench.device().running["fw"] = "1.4.0";
+    for (int lost = 0; lost < 2000; ++lost)
+        bench.kernel->notify(DEVLINK_CMD_PORT_NEW, bench.second);
+    EXPECT_EQ("1.4.0", runningVersion(bench.first)) << "what was lost may have been about it";
+
+    bench.kernel->add("0000:06:00.0");
+    EXPECT_TRUE(ma::getCanBeUpdated("0000:06:00.0")) << "plugged in";
+    for (const char* file : {"/class", "/vendor"})
+        bench.kernel->files.erase("/sys/bus/pci/devices/0000:06:00.0" + std::string(file));
+    EXPECT_EQ(2U, ma::enumerateAdapters().size()) << "pulled out";
+    EXPECT_FALSE(ma::getCanBeUpdated("0000:06:00.0"));
+}
+
+/// All that reads, which must not ask a device that is being flashed.
+void expectAnswersFromMemory(const test::DevlinkBench& bench, bool isKnown) {
+    const int asked = bench.kernel->requests;
+    EXPECT_EQ(2U, ma::enumerateAdapters().size());
+    EXPECT_EQ(isKnown, ma::getCanBeUpdated(bench.first));
+    EXPECT_EQ(isKnown ? "1.2.3" : "", runningVersion(bench.first));
+    EXPECT_GT(100, ma::getFlashImageUpdateProgress(bench.first));
+    EXPECT_EQ(5, ma::getPCIAddress(bench.first).bus);
+    EXPECT_EQ(asked, bench.kernel->requests);
+}
+
+TEST(DevlinkInventoryTest, NeverAsksADeviceThatIsBeingFlashed) {
+    test::DevlinkBench bench;
+    bench.device().duringFlash = [&] { expectAnswersFromMemory(bench, true); };
+    EXPECT_TRUE(bench.install().done);
+
+    // By somebody else, who tells only the kernel; it begins before the first look, or after it.
+    bench.device() = {};
+    bench.restart();
+    EXPECT_TRUE(ma::getCanBeUpdated(bench.first));
+    bench.kernel->notify(DEVLINK_CMD_FLASH_UPDATE, bench.first);
+    bench.kernel->notify(DEVLINK_CMD_NEW, bench.second);
+    expectAnswersFromMemory(bench, true);
+    bench.device().running["fw"] = "1.3.0";
+    bench.kernel->notify(DEVLINK_CMD_FLASH_UPDATE_END, bench.first);
+    EXPECT_EQ("1.3.0", runningVersion(bench.first));
+
+    bench.restart();
+    bench.device() = {};
+    {
+        const auto lock = bench.kernel->lock("/var/lib/quenx/locks/0000:05:00.lock", {});
+        expectAnswersFromMemory(bench, false);
+        EXPECT_EQ(ma::PrepareStatus::UnspecifiedError, bench.prepare());
+    }
+    EXPECT_TRUE(ma::getCanBeUpdated(bench.first));
+}
+
+TEST(DevlinkInventoryTest, ServesManyThreads) {
+    const test::DevlinkBench bench;
+    ASSERT_EQ(0, bench.prepare());
+    std::vector<std::function<void()>> calls{[&] { bench.write(); }, [&] { bench.prepare(); },
+                                             [&] { bench.kernel->notify(DEVLINK_CMD_NEW, bench.first); }};
+    for (const std::string& adapter : {bench.first, bench.second}) {
+        calls.emplace_back([=] { ma::enumerateAdapters(); });
+        calls.emplace_back([=] { ma::getAdapterInfo(adapter); });
+        calls.emplace_back([=] { ma::getCanBeUpdated(adapter); });
+        calls.emplace_back([=] { ma::getFlashImageUpdateProgress(adapter); });
+    }
+    test::together(calls);
+    EXPECT_TRUE(bench.write().done);
+}
+
+}  // namespace
