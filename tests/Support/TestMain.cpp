@@ -2,6 +2,7 @@
 #include <gtest/gtest.h>
 
 #include "Support/Environment.h"
+#include "Support/NetlinkGuard.h"
 #include "Support/SyslogCapture.h"
 
 namespace {
@@ -14,6 +15,7 @@ class LogCleaner : public ::testing::EmptyTestEventListener {
 }  // namespace
 
 int main(int argc, char** argv) {
+    test::forbidGenericNetlink();
     ::testing::InitGoogleTest(&argc, argv);
     const test::ChosenEnvironment environment;
     ::testing::UnitTest::GetInstance()->listeners().Append(new LogCleaner);

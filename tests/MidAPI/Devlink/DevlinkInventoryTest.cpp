@@ -3,8 +3,10 @@
 #include <linux/devlink.h>
 
 #include <cerrno>
+#include <csignal>
 
 #include "MidAPI/Devlink/DevlinkBench.h"
+#include "Support/NetlinkGuard.h"
 #include "Support/SyslogCapture.h"
 #include "Support/Together.h"
 
@@ -154,6 +156,13 @@ TEST(DevlinkInventoryTest, NeverAsksADeviceThatIsBeingFlashed) {
         EXPECT_EQ(ma::PrepareStatus::UnspecifiedError, bench.prepare());
     }
     EXPECT_TRUE(ma::getCanBeUpdated(bench.first));
+}
+
+TEST(DevlinkInventoryTest, IsOutOfReachForAllTests) {
+    // Every test program begins with this guard, and what it starts inherits it: a suite that passes has
+    // opened no such socket.
+    if (sizeof(void*) == 4 || !test::forbidGenericNetlink()) GTEST_SKIP() << "no filter for socket calls";
+    EXPECT_EXIT(ma::devlink::LinuxMachine().openNetlink(), testing::KilledBySignal(SIGSYS), "");
 }
 
 TEST(DevlinkInventoryTest, ServesManyThreads) {
