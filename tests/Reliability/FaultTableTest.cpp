@@ -119,7 +119,7 @@ class FaultTableTest : public test::UpdateTest {
         ASSERT_EQ(result.job.has_value(), row.returnValue == kJobStarted);
         if (result.job) {
             const core::InstanceValue job = waitForEnd(*result.job);
-            EXPECT_EQ(UpdateClient::row(job, {"JobState", "ErrorCode", "ErrorDescription"}), row.job);
+            EXPECT_EQ(UpdateTest::row(job, {"JobState", "ErrorCode", "ErrorDescription"}), row.job);
             EXPECT_EQ(text(job, "PercentComplete"), "100");
             m_requests.deleteInstance(*result.job);
         }

@@ -8,10 +8,10 @@
 #include <string>
 #include <vector>
 
+#include "Framework/Requests/CimRequests.h"
 #include "Providers/SoftwareUpdate/HookedBackend.h"
 #include "Providers/SoftwareUpdate/Quenx_ConcreteJob.h"
 #include "Providers/SoftwareUpdate/SoftwareUpdateAgent.h"
-#include "Providers/SoftwareUpdate/UpdateClient.h"
 #include "Support/ProviderLibrary.h"
 #include "Support/SimulatedAdapters.h"
 #include "Support/SyslogCapture.h"
@@ -20,12 +20,48 @@
 
 namespace test {
 
+/// What a call of a method came to.
+struct CallResult {
+    unsigned int returnValue = 0;
+    std::string error;  ///< the text of the CIM error; the return value means nothing then
+    std::optional<core::CimPath> job;
+    std::string characteristics;
+};
+
 /// The provider as a host has it, on simulated adapters: a configuration, the adapter locker, the inventory
-/// loaded and an agent in this process, the log at the debug level.
-class UpdateTest : public ::testing::Test, public UpdateClient {
+/// loaded and an agent in this process, the log at the debug level; and a client of it, which any thread may
+/// use.
+class UpdateTest : public ::testing::Test {
   protected:
     UpdateTest();
     ~UpdateTest() override;
+
+    /// "Quenx_EthernetPort" or another class, by its Name.
+    core::CimPath pathNamed(const std::string& className, const std::string& name) const;
+    core::CimPath port(const std::string& adapter) const { return pathNamed("Quenx_EthernetPort", adapter); }
+    core::CimPath service() const {
+        return m_requests.enumerateInstanceNames("Quenx_SoftwareInstallationService").at(0);
+    }
+
+    CallResult call(const std::string& method, const std::vector<core::Argument>& arguments) const;
+    /// InstallFromURI with options, by default {5}, on an instance or on the port of an adapter.
+    CallResult install(const std::string& uri, const core::CimPath& target,
+                       std::vector<std::uint16_t> options = {5}, std::vector<std::string> values = {}) const;
+    CallResult install(const std::string& uri, const char* adapter) const {
+        return install(uri, port(adapter));
+    }
+
+    /// Follows the job to its end; fails the test when it takes too long.
+    core::InstanceValue waitForEnd(const core::CimPath& job) const;
+
+    static std::uint64_t state(const core::InstanceValue& job) { return job.number("JobState"); }
+    /// A property as text, an array's elements joined by commas; empty when it is null or not there.
+    static std::string text(const core::InstanceValue& instance, const char* property);
+    /// The properties' texts, separated by "; ".
+    static std::string row(const core::InstanceValue& instance, const std::vector<const char*>& properties);
+    /// The row of each instance of the class.
+    std::vector<std::string> table(const std::string& className,
+                                   const std::vector<const char*>& properties) const;
 
     /// Installs an image that suits eth0, and expects state 7.
     void expectUpdateWorks() const;
@@ -49,6 +85,14 @@ class UpdateTest : public ::testing::Test, public UpdateClient {
     std::shared_ptr<HookedBackend> m_backend;
     ProviderLibrary m_inventory;
     std::unique_ptr<core::SoftwareUpdateAgent> m_agent;
+    /// Has no state of its own.
+    mutable core::CimRequests m_requests{"root/cimv2"};
 };
+
+// Arguments of methods.
+core::Argument pathArgument(const char* name, const core::CimPath& path);
+core::Argument textArgument(const char* name, const std::string& text);
+core::Argument codesArgument(const char* name, const std::vector<std::uint16_t>& codes);
+core::Argument textsArgument(const char* name, const std::vector<std::string>& texts);
 
 }  // namespace test
