@@ -26,8 +26,15 @@ TEST_F(DispatcherTest, ReadsInstancesAndTheirNeighbours) {
     EXPECT_TRUE(none.instances.at(0).properties.empty());
 
     const ParameterValue a = gadget("a", "1");
-    EXPECT_EQ(call("AssociatorNames", {{"ObjectName", a}, {"Role", "from"}}).paths.size(), 1U);
-    EXPECT_EQ(call("AssociatorNames", {{"ObjectName", a}, {"Role", "To"}}).paths.size(), 0U);
+    const std::tuple<std::size_t, const char*, ParameterValue> filters[] = {
+        {1, "Role", "from"},
+        {0, "Role", "To"},
+        {1, "ResultRole", "TO"},
+        {0, "ResultRole", "From"},
+        {0, "AssocClass", ClassName{"Test_Thing"}},
+        {0, "ResultClass", ClassName{"Test_Link"}}};
+    for (const auto& [count, name, value] : filters)
+        EXPECT_EQ(call("AssociatorNames", {{"ObjectName", a}, {name, value}}).paths.size(), count) << name;
     // The path comes back in a request, with the keys of its references as texts.
     const auto names = call("ReferenceNames", {{"ObjectName", a}}).paths;
     ASSERT_EQ(names.size(), 1U);

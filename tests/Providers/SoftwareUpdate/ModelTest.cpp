@@ -15,33 +15,43 @@ namespace {
 
 using core::CimPath;
 using Names = std::set<std::string>;
-using Texts = std::vector<std::string>;
 
 class ModelTest : public test::UpdateTest {
   protected:
-    std::size_t count(const char* className) const { return m_requests.enumerateInstances(className).size(); }
     /// As the provider has them, before the request layer joins equal ones.
     static std::size_t rows(const char* className) {
         return core::GetCimBroker()->getInstances(className, "").size();
     }
-    /// A line for each value that is set, times aside; the keys have an exclamation mark.
-    static std::string valuesOf(const core::InstanceValue& instance) {
+    /// A line for each value of the first instance that is set, and for each of the others that is different
+    /// there. Times are left out; the keys have an exclamation mark.
+    std::string valuesOf(const std::string& className) const {
         std::string values;
-        for (const auto& [name, value, isKey, referenceClass] : instance.properties)
-            if (!value.isNull() && value.type != core::CimType::Datetime)
-                values += "  " + name + (isKey ? "!=" : "=") + core::valueText(value) + "\n";
+        Names first;
+        for (const core::InstanceValue& instance : m_requests.enumerateInstances(className)) {
+            values += className + "\n";
+            const bool isFirst = first.empty();
+            for (const auto& [name, value, isKey, referenceClass] : instance.properties) {
+                if (value.type == core::CimType::Datetime) continue;
+                const std::string text = value.isNull() ? " is null" : "=" + core::valueText(value);
+                const std::string line = "  " + name + (isKey ? "!" : "") + text + "\n";
+                if (isFirst ? !value.isNull() : !first.contains(line)) values += line;
+                if (isFirst) first.insert(line);
+            }
+        }
         return values;
     }
 };
 
 TEST_F(ModelTest, ServesEachClassAsTheSampleHasIt) {
+    file("iscsi.rom", test::madeRom({{utils::FirmwareType::iSCSI, 7}}, 0x15ad, 0x07b0));
+    EXPECT_EQ(rows("Quenx_SoftwareIdentity"), 10U);  // nothing of it stays that an update changes
     waitForEnd(*install(goodImage(), "eth0").job);
     Names classes;
     for (const core::ClassChain& chain : m_requests.enumerateClasses("", true))
         if (chain.front()->name.starts_with("Quenx_")) classes.insert(chain.front()->name);
     std::string served;
     for (const std::string& name : classes)
-        served += name + "\n" + valuesOf(m_requests.enumerateInstances(name).at(0));
+        served += valuesOf(name);
     const auto sample = test::readTestFile(QUENX_MODEL_SAMPLE);
     std::string expected(sample.begin(), sample.end());
     expected = std::regex_replace(expected, std::regex("<FOLDER>"), m_folder.path());
@@ -54,43 +64,6 @@ TEST_F(ModelTest, ServesEachClassAsTheSampleHasIt) {
          m_requests.getClass("Quenx_SoftwareInstallationService").at(1)->methods)
         methods += each.name + " ";
     EXPECT_EQ(methods, "CheckSoftwareIdentity InstallFromSoftwareIdentity InstallFromURI ");
-}
-
-TEST_F(ModelTest, AssociationsJoinWhatBelongsTogetherInTheirRoles) {
-    EXPECT_EQ(count("Quenx_OwningJobElement"), 0U);
-    EXPECT_EQ(count("Quenx_AffectedJobElement"), 0U);
-    const CimPath job = *install(goodImage(), "eth0").job;
-    waitForEnd(job);
-    const auto classes = [&](const CimPath& from, const char* association, const char* role,
-                             const char* resultRole) {
-        Names found;
-        for (const CimPath& path : m_requests.associatorNames(from, {association, "", role, resultRole}))
-            found.insert(path.getClassName());
-        return found;
-    };
-    const std::string port = "Quenx_EthernetPort";
-    const std::string card = "Quenx_PortController";
-    EXPECT_EQ(classes(job, "CIM_AffectedJobElement", "AffectingElement", "AffectedElement"),
-              (Names{port, card}));
-    EXPECT_EQ(classes(job, "", "AffectingElement", "AffectingElement"), Names{});
-    EXPECT_EQ(classes(service(), "CIM_ServiceAffectsElement", "AffectingElement", ""),
-              (Names{port, card, "Quenx_SoftwareIdentity"}));
-    EXPECT_EQ(count("Quenx_OwningJobElement"), 1U);
-    EXPECT_EQ(count("Quenx_AffectedJobElement"), 2U);
-    EXPECT_EQ(count("Quenx_ElementConformsToProfile"), 1U);
-    // The image, and four ports, each with its card: the pair of ports that shares one names it once.
-    EXPECT_EQ(rows("Quenx_ServiceAffectsElement"), 9U);
-    EXPECT_EQ(count("Quenx_ServiceAffectsElement"), 8U);
-}
-
-TEST_F(ModelTest, ServesTheProfilesOfBothProviders) {
-    EXPECT_EQ(table("Quenx_RegisteredProfile",
-                    {"InstanceID", "RegisteredName", "RegisteredVersion", "RegisteredOrganization",
-                     "SpecificationType", "Caption", "Description", "ElementName"}),
-              (Texts{"Quenx:EthernetPort; Ethernet Port; 1.0.1; 2; 2; Ethernet Port; "
-                     "Ethernet Port Profile for Tarvel(R) Ethernet Adapters; ",
-                     "Quenx:SoftwareUpdate; Software Update; 1.0.0; 2; 2; Software Update; "
-                     "Software Update Profile for Tarvel(R) Ethernet Adapters; "}));
 }
 
 TEST_F(ModelTest, EveryReferenceOfTheModelResolves) {
