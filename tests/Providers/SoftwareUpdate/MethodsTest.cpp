@@ -276,6 +276,42 @@ TEST_F(MethodsTest, AnswerEachCallWithItsValueLineJobAndClaim) {
     EXPECT_EQ(test::componentsOf("eth1"), "IMG_PXE 1, IMG_UEFI 0");
 }
 
+TEST_F(MethodsTest, DecideByTheStatusOfThePreparation) {
+    const std::string downgrade =
+        "EDowngradeDetected:Downgrade was detected for " + m_uri + ". Try to use FORCE_INSTALL option.";
+    const std::string types =
+        "EDowngradeDetected:The selected flash image cannot be used because it does not contain the same "
+        "image "
+        "types. Please select a flash file with matching image types.";
+    const struct {
+        int status;
+        bool isForced;
+        bool areDowngradesBanned;
+        std::uint32_t returnValue;
+        std::string line{};
+    } table[] = {
+        {1, true, false, 5, "EInvalidParameter:Invalid parameter detected for " + m_uri},
+        {2, true, false, 4097, "EAdapterNotSupported:Image " + m_uri + " is not supported for adapter eth0"},
+        {3, false, false, 4099, downgrade},
+        {3, true, true, kJobStarted},
+        {4, false, false, 4099, downgrade},
+        {4, true, false, kJobStarted},
+        {4, true, true, 4099, types},
+        {4, false, true, 4099, types},
+        {5, true, false, 4106, "ENotApplicableForTarget:Not applicable for " + m_uri},
+        {6, true, false, 2, "EUnspecifiedError:Unspecified error occurred for " + m_uri},
+        {7, false, false, kJobStarted},
+        {-1, false, false, kJobStarted},
+    };
+    for (const auto& row : table) {
+        const utils::SMASHv2Config config(
+            m_folder.write("policy.conf", row.areDowngradesBanned ? "OEMCustomizeable=5\n" : "\n"));
+        m_backend->prepareStatus = row.status;
+        expect({fromUri(m_uri, m_port, row.isForced ? Codes{5, 3} : Codes{5}), row.returnValue,
+                row.line.empty() ? Texts{} : Texts{row.line}});
+    }
+}
+
 TEST_F(MethodsTest, ACheckGivesTheClaimBackWhereTheConfigurationSaysSo) {
     m_folder.write("quenx.conf", "ReleaseClaimAfterCheck = 1\nFWFilePath=" + m_folder.path() + "\n");
     EXPECT_EQ(make(check(m_image, m_port)).returnValue, 0U);
