@@ -6,8 +6,6 @@
 
 #include <algorithm>
 #include <cstdlib>
-#include <filesystem>
-#include <fstream>
 #include <set>
 #include <thread>
 
@@ -173,22 +171,6 @@ TEST(BackendTest, IsChosenByCallThenEnvironment) {
     ::unsetenv("QUENX_ADAPTERS");
     ::unsetenv("QUENX_ADAPTER_STATE");
     ma::setBackend(mine);
-}
-
-TEST(BackendTest, IsThatOfTheSystemWithoutAnEnvironment) {
-    const test::TempFolder root;
-    const auto answers = root.askAsRoot([&] {
-        ::unsetenv("QUENX_ADAPTERS");
-        ma::setBackend(nullptr);
-        const bool isEmpty = ma::enumerateAdapters().empty();
-        std::filesystem::create_directory("/etc");
-        std::ofstream("/etc/quenx-adapters.toml") << test::kTestAdapters;
-        ma::setBackend(nullptr);
-        return isEmpty && install("eth0", test::madeRom({{PXE, 2}})).done &&
-               std::filesystem::exists("/var/lib/quenx/adapters/eth0/state");
-    });
-    if (!answers) GTEST_SKIP() << "this system lets nobody have a root folder";
-    EXPECT_TRUE(*answers);
 }
 
 TEST(BackendTest, AnswersUntilTheProcessHasEnded) {

@@ -2,8 +2,6 @@
 #include "Support/TempFolder.h"
 
 #include <gtest/gtest.h>
-#include <sched.h>
-#include <sys/wait.h>
 #include <unistd.h>
 
 #include <cstdlib>
@@ -33,21 +31,6 @@ std::string TempFolder::write(std::string_view name, std::string_view content) c
 
 std::string TempFolder::write(std::string_view name, std::span<const std::uint8_t> content) const {
     return write(name, std::string(content.begin(), content.end()));
-}
-
-std::optional<bool> TempFolder::askAsRoot(const std::function<bool()>& question) const {
-    enum Answer { Yes, No, NotAllowed };
-    const pid_t child = ::fork();
-    if (child == 0) {
-        const auto enter = [this] { return ::chroot(m_path.c_str()) == 0; };
-        // On most systems who is not root may do it in a user namespace.
-        if (!enter() && (::unshare(CLONE_NEWUSER) != 0 || !enter())) ::_exit(NotAllowed);
-        ::_exit([&]() noexcept { return question() ? Yes : No; }());
-    }
-    int status = 0;
-    ::waitpid(child, &status, 0);
-    if (WIFEXITED(status) && WEXITSTATUS(status) == NotAllowed) return std::nullopt;
-    return status == Yes;
 }
 
 std::vector<std::uint8_t> readTestFile(const std::string& path) {

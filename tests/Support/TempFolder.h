@@ -3,8 +3,6 @@
 
 #include <cstdint>
 #include <filesystem>
-#include <functional>
-#include <optional>
 #include <span>
 #include <string>
 #include <string_view>
@@ -26,10 +24,6 @@ class TempFolder {
     /// Writes a file in the folder and returns its path; a failed expectation when that does not work.
     std::string write(std::string_view name, std::string_view content) const;
     std::string write(std::string_view name, std::span<const std::uint8_t> content) const;
-
-    /// Asks in a child process whose root folder this one is, so that files at fixed places can be a test's
-    /// own. Nothing where the system lets nobody have a root folder.
-    std::optional<bool> askAsRoot(const std::function<bool()>& question) const;
 
   private:
     std::filesystem::path m_path;

@@ -194,16 +194,22 @@ bool canMount() {
     return test::run(withOwnMounts({"mount --bind /etc /etc"})).status == 0;
 }
 
-TEST(DaemonTest, ReadsItsFileInEtcWhereNoneIsNamed) {
+TEST(DaemonTest, ReadsTheSystemsFilesWhereNoneAreNamed) {
     if (!canMount()) GTEST_SKIP() << "nothing can be mounted";
-    const test::TempFolder etc;
-    const auto withThisEtc = [&](const std::string& program, const std::string& argument) {
-        return test::run(
-            withOwnMounts({"mount --bind $0 /etc && exec \"$@\"", etc.path(), program, argument}),
-            {"QUENX_ADAPTERS"});
+    const test::TempFolder etc;  // and what is written at run time
+    const auto withThisEtc = [&](const std::string& program, const std::string& arguments) {
+        return test::run(withOwnMounts({"mount --bind $0 /etc && mount --bind $0 /var/lib && exec \"$1\" $2",
+                                        etc.path(), program, arguments}),
+                         {"QUENX_ADAPTERS"});
     };
+    EXPECT_THAT(withThisEtc(QUENXCTL, "adapters").out, HasSubstr("There are no adapters."));
     etc.write("quenx-adapters.toml", test::kTestAdapters);
-    EXPECT_THAT(withThisEtc(QUENXCTL, "adapters").out, HasSubstr("eth4  06:00.0"));
+    etc.write("quenx-cimprovider.conf", "FWFilePath=/etc\n");
+    etc.write("new.rom", test::realRom("efi-virtio"));
+    EXPECT_THAT(withThisEtc(QUENXCTL, "identities").out, HasSubstr("file:///etc/new.rom"));
+    EXPECT_EQ(withThisEtc(QUENXCTL, "install --target eth0 --force /etc/new.rom").status, 0);
+    EXPECT_TRUE(std::filesystem::exists(etc / "quenx/adapters/eth0/state"));
+
     const ProgramResult without = withThisEtc(QUENX_CIMD, "--check-config");
     EXPECT_FALSE(contains(without.error, "quenx-cimd.toml")) << without.error;
     std::filesystem::create_directory(etc / "quenx-cimd");
@@ -216,21 +222,9 @@ TEST(DaemonTest, ReadsItsFileInEtcWhereNoneIsNamed) {
 
 TEST(DaemonTest, AsksPamAndTheGroupsOfTheSystem) {
     if (!canMount()) GTEST_SKIP() << "nothing can be mounted";
-    // A system of its own: the users below, all with the password "secret".
+    // A system of its own, whose users all have the password "secret".
     const test::TempFolder etc;
-    const std::string secret =
-        ":$6$quenxtest$.xlSksxRD.dejcRvfnG4BPvAFrzRVgFmpd5."
-        "PLjUWcskxPz5GZtukA9MFOf55EEozqmI15fR8UkYekJBjxiOL0:"
-        "19000:0:99999:7::";
-    std::string passwd = "root:x:0:0::/:/bin/sh\n";
-    std::string shadow = "root" + secret + ":\nexpired" + secret + "19001:\n";
-    for (const std::string name : {"chief", "reader", "watcher", "other", "expired"}) {
-        passwd += name + ":x:" + std::to_string(passwd.size()) + ":1::/:/bin/sh\n";
-        if (name != "expired") shadow += name + secret + ":\n";
-    }
-    etc.write("passwd", passwd);
-    etc.write("shadow", shadow);
-    etc.write("group", "root:x:0:\nquenx-admin:x:101:chief\nwatchers:x:102:watcher\n");
+    std::filesystem::copy(QUENX_SYSTEM_TEST_DIR "/samples/etc", etc.path());
     std::filesystem::copy("/etc/pam.d", etc / "pam.d");
     std::filesystem::copy(QUENX_PACKAGING_DIR "/pam.d", etc / "pam.d",
                           std::filesystem::copy_options::overwrite_existing);

@@ -75,17 +75,6 @@ TEST_F(SMASHv2ConfigTest, ReadsAndLogsEachLine) {
     }
 }
 
-TEST_F(SMASHv2ConfigTest, IsThatOfTheSystemUnlessThereIsAnother) {
-    std::filesystem::create_directory(folder / "etc");
-    folder.write("etc/quenx-cimprovider.conf", "Namespace=root/system\n");
-    write("Namespace=root/other\n");
-    EXPECT_EQ(utils::AutoSingleton<SMASHv2Config>::getInstance()->getNamespace(), "root/other");
-    const auto isRead =
-        folder.askAsRoot([] { return SMASHv2Config::CreateSingleton()->getNamespace() == "root/system"; });
-    if (!isRead) GTEST_SKIP() << "this system lets nobody have a root folder";
-    EXPECT_TRUE(*isRead);
-}
-
 TEST_F(SMASHv2ConfigTest, KeepsTheValueOfARemovedKeyAndTheBanOnDowngrades) {
     EXPECT_TRUE(config.isDowngradeEnabled());  // no file yet
     write("Namespace=root/a\nOEMCustomizeable=5\nReleaseClaimAfterCheck=1\n");
