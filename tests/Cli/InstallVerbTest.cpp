@@ -6,13 +6,13 @@
 #include <sstream>
 
 #include "Cli/Verbs/Verbs.h"
+#include "Framework/Requests/CimRequests.h"
 #include "Support/TempFolder.h"
 #include "Support/TestRoms.h"
 
 namespace {
 
 using cli::ExitStatus;
-using core::AssociationFilter;
 using core::CimPath;
 using core::CimType;
 using core::CimValue;
@@ -20,7 +20,6 @@ using core::InstanceValue;
 using core::PropertyFilter;
 using utils::FirmwareType;
 using Instances = std::vector<InstanceValue>;
-using Paths = std::vector<CimPath>;
 
 core::PropertyValue texts(const std::string& name, const std::vector<std::string>& values) {
     return {name, CimValue::arrayOf(CimType::String, {values.begin(), values.end()}), false, {}};
@@ -45,7 +44,7 @@ const Instances kNew = {component("IMG_PXE", 2), component("IMG_UEFI", 1)};
 constexpr const char* kUpdated = "eth0 was updated.\n  IMG_PXE   1 -> 2\n  IMG_UEFI  0 -> 1\n";
 
 /// One adapter, 1af4:1041, and a service that answers as it is told.
-class FakeService : public core::CimOperations {
+class FakeService : public core::CimRequests {
   public:
     Instances installed = kOld;
     Instances installedAfterJob = kNew;
@@ -58,7 +57,7 @@ class FakeService : public core::CimOperations {
     std::string jobNamespace;
     bool isReadable = true;  ///< what is installed, after the job
 
-    const std::string& getNamespace() const override { return m_namespace; }
+    FakeService() : CimRequests("") {}
     Instances enumerateInstances(const std::string& className, const PropertyFilter&) override {
         if (className != "Quenx_EthernetPort") return {};
         return {{CimPath("Quenx_EthernetPort.DeviceID=\"eth0\""),
@@ -66,7 +65,7 @@ class FakeService : public core::CimOperations {
                   texts("OtherIdentifyingInfo", {"1af4:1041"}),
                   texts("IdentifyingDescriptions", {"PCI Vendor and Device ID"})}}};
     }
-    Paths enumerateInstanceNames(const std::string& className) override {
+    std::vector<CimPath> enumerateInstanceNames(const std::string& className) override {
         return {CimPath(className + ".Name=\"1\"")};
     }
     InstanceValue getInstance(const CimPath&, const PropertyFilter&) override {
@@ -79,15 +78,10 @@ class FakeService : public core::CimOperations {
         if (jobs.empty()) installed = installedAfterJob;
         return view;
     }
-    Instances associators(const CimPath&, const AssociationFilter&, const PropertyFilter&) override {
+    Instances associators(const CimPath&, const core::AssociationFilter&, const PropertyFilter&) override {
         if (jobs.empty() && !isReadable) throw core::CimError(core::CimStatus::Failed, "gone");
         return installed;
     }
-    Paths associatorNames(const CimPath&, const AssociationFilter&) override { return {}; }
-    Instances references(const CimPath&, const AssociationFilter&, const PropertyFilter&) override {
-        return {};
-    }
-    Paths referenceNames(const CimPath&, const AssociationFilter&) override { return {}; }
     core::MethodResult invokeMethod(const CimPath&, const std::string&,
                                     const std::vector<core::Argument>&) override {
         isCalled = true;
@@ -99,12 +93,6 @@ class FakeService : public core::CimOperations {
         path.setNamespace(jobNamespace);
         return {4096, {{"Job", CimValue::of(CimType::Reference, path)}}};
     }
-    void deleteInstance(const CimPath&) override {}
-    core::ClassChain getClass(const std::string&) override { return {}; }
-    std::vector<core::ClassChain> enumerateClasses(const std::string&, bool) override { return {}; }
-
-  private:
-    std::string m_namespace;
 };
 
 class InstallVerbTest : public ::testing::Test {

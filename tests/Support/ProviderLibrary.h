@@ -28,12 +28,6 @@ class ProviderLibrary {
         return true;
 #endif
     }
-    /// Whether a library of that path is mapped now.
-    static bool isMapped(const std::string& path) {
-        void* const handle = dlopen(path.c_str(), RTLD_NOW | RTLD_NOLOAD);
-        if (handle != nullptr) dlclose(handle);
-        return handle != nullptr;
-    }
 
   private:
     void* m_handle;
