@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include <gmock/gmock.h>
 
+#include <filesystem>
+
 #include "CimXml/Request.h"
 #include "CimXml/Response.h"
 #include "CimXml/WireCheck.h"
@@ -10,16 +12,11 @@ namespace {
 
 using cimxml::IntrinsicResult;
 using cimxml::Request;
-using cimxml::ResultKind;
 using cimxml::WireError;
 using core::CimPath;
 using core::CimType;
 using core::CimValue;
 using ::testing::HasSubstr;
-using ::testing::Not;
-using ::testing::ResultOf;
-using ::testing::StrEq;
-using ::testing::Throws;
 
 template <class T>
 T held(const Request& request, std::string_view name) {
@@ -54,18 +51,12 @@ TEST(RequestReaderTest, ReadsWhatClientsSend) {
     held<std::monostate>(open, "FilterQuery");
 }
 
-/// The call inside an envelope that is right.
-std::string wrapped(const std::string& call) {
-    return "<CIM CIMVERSION=\"2.3\" DTDVERSION=\"2.1\"><MESSAGE ID=\"1\" "
-           "PROTOCOLVERSION=\"1.1\"><SIMPLEREQ>" +
-           call + "</SIMPLEREQ></MESSAGE></CIM>";
-}
-
+/// A call with this parameter, in an envelope that is right.
 std::string parameterWith(const std::string& value) {
-    return wrapped(
-        "<IMETHODCALL NAME=\"X\"><LOCALNAMESPACEPATH><NAMESPACE NAME=\"root\"/></LOCALNAMESPACEPATH>"
-        "<IPARAMVALUE NAME=\"P\">" +
-        value + "</IPARAMVALUE></IMETHODCALL>");
+    return "<CIM CIMVERSION='2.3' DTDVERSION='2.1'><MESSAGE ID='1' PROTOCOLVERSION='1.1'><SIMPLEREQ>"
+           "<IMETHODCALL NAME='X'><LOCALNAMESPACEPATH><NAMESPACE NAME='root'/></LOCALNAMESPACEPATH>"
+           "<IPARAMVALUE NAME='P'>" +
+           value + "</IPARAMVALUE></IMETHODCALL></SIMPLEREQ></MESSAGE></CIM>";
 }
 
 TEST(RequestReaderTest, KeepsTextsAsTheyAre) {
@@ -78,71 +69,28 @@ TEST(RequestReaderTest, KeepsTextsAsTheyAre) {
         EXPECT_EQ(held<std::string>(cimxml::readRequest(parameterWith(text)), "P"), expected);
 }
 
-/// A path whose key is a path, and so on.
-std::string nested(int levels) {
-    return "<INSTANCENAME CLASSNAME='C'>" +
-           (levels == 0 ? "<KEYVALUE>\"</KEYVALUE>"
-                        : "<VALUE.REFERENCE>" + nested(levels - 1) + "</VALUE.REFERENCE>") +
-           "</INSTANCENAME>";
-}
-
 TEST(RequestReaderTest, RefusesEachFaultByItsName) {
-    const std::string good = test::readSample("w-GetInstance.xml");
-    const auto changed = [&](const std::string& from, const std::string& to) {
-        std::string text = good;
-        EXPECT_NE(text.find(from), std::string::npos) << from;
-        return text.replace(text.find(from), from.size(), to);
-    };
-    // Its text is 2^n quotes long.
-    held<CimPath>(cimxml::readRequest(parameterWith(nested(3))), "P");
-    const std::string place = "<LOCALNAMESPACEPATH><NAMESPACE NAME='root'/></LOCALNAMESPACEPATH>";
-    const std::pair<const char*, std::vector<std::string>> table[] = {
-        {"unsupported-cim-version", {changed("CIMVERSION=\"2.0\"", "CIMVERSION=\"3.0\"")}},
-        {"unsupported-dtd-version", {changed("DTDVERSION=\"2.0\"", "DTDVERSION=\"1.0\"")}},
-        {"unsupported-protocol-version", {changed("PROTOCOLVERSION=\"1.0\"", "PROTOCOLVERSION=\"2.0\"")}},
-        {"request-not-well-formed", {changed("</IMETHODCALL>", "")}},
-        {"multiple-requests-unsupported",
-         {"<CIM CIMVERSION='2.0' DTDVERSION='2.0'><MESSAGE ID='1' "
-          "PROTOCOLVERSION='1.0'><MULTIREQ/></MESSAGE></CIM>"}},
-        {"request-not-valid",
-         {"<CIM/>", changed("PROTOCOLVERSION=\"1.0\"", ""), changed("ID=\"4711\"", ""),
-          changed("4711", std::string(1025, '1')), changed("NAME=\"GetInstance\"", ""),
-          changed("<SIMPLEREQ>", "<SIMPLEREQ>text"), wrapped(""), wrapped("<OTHERCALL/>"),
-          wrapped("<IMETHODCALL NAME='X'/>"),
-          wrapped("<IMETHODCALL NAME='X'><LOCALNAMESPACEPATH/></IMETHODCALL>"),
-          wrapped("<METHODCALL NAME='X'>" + place + "</METHODCALL>"), parameterWith("<VALUE/><VALUE/>"),
-          parameterWith("<VALUE><B/></VALUE>"), parameterWith("<UNKNOWN/>"), parameterWith(nested(4)),
-          parameterWith("<VALUE.REFARRAY><VALUE.REFERENCE>" + nested(4) +
-                        "</VALUE.REFERENCE></VALUE.REFARRAY>"),
-          parameterWith("<VALUE.ARRAY><CLASSNAME NAME='x'/></VALUE.ARRAY>"),
-          parameterWith("<INSTANCENAME CLASSNAME='C'><KEYVALUE>1</KEYVALUE>"
-                        "<KEYVALUE>2</KEYVALUE></INSTANCENAME>")}},
-    };
-    for (const auto& [fault, messages] : table) {
-        const auto isIt =
-            ResultOf([](const WireError& error) { return error.fault().cimError; }, StrEq(fault));
-        for (const std::string& message : messages)
-            EXPECT_THAT([&] { cimxml::readRequest(message); }, Throws<WireError>(isIt)) << message;
+    // The text of a path doubles with each path that has it as a key.
+    held<CimPath>(cimxml::readRequest(test::readSample("accepted-requests/paths-four-deep.xml")), "P");
+    for (const std::string& name : test::sampleNames("refused-requests/")) {
+        // Behind the fault, some have what it consists of.
+        const std::string fault = std::filesystem::path(name).stem().stem();
+        const auto isIt = ::testing::ResultOf([](const WireError& error) { return error.fault().cimError; },
+                                              ::testing::StrEq(fault));
+        EXPECT_THAT([&] { cimxml::readRequest(test::readSample(name)); }, ::testing::Throws<WireError>(isIt))
+            << name;
     }
 }
 
 TEST(RequestReaderTest, NotesAnArgumentThatIsNotOfItsStatedType) {
-    const auto mistyped = [](const std::string& argument) {
-        const Request request = cimxml::readRequest(
-            wrapped("<METHODCALL NAME='X'><LOCALCLASSPATH><LOCALNAMESPACEPATH><NAMESPACE NAME='root'/>"
-                    "</LOCALNAMESPACEPATH><CLASSNAME NAME='C'/></LOCALCLASSPATH><PARAMVALUE NAME='P' " +
-                    argument + "</PARAMVALUE></METHODCALL>"));
+    const auto mistyped = [](const std::string& name) {
+        const Request request = cimxml::readRequest(test::readSample(name));
         return std::get<cimxml::MethodCall>(request.call).mistypedArgument;
     };
-    const std::string reference = "<VALUE.REFERENCE><CLASSNAME NAME='C'/></VALUE.REFERENCE>";
-    const std::string array = "<VALUE.ARRAY><VALUE>5</VALUE></VALUE.ARRAY>";
-    for (const std::string& good : {">" + reference, "PARAMTYPE='reference'>" + reference,
-                                    "PARAMTYPE='uint8'>" + array, std::string(">")})
-        EXPECT_EQ(mistyped(good), "") << good;
-    for (const std::string& bad :
-         {"PARAMTYPE='string'>" + reference, std::string("PARAMTYPE='reference'><VALUE>C</VALUE>"),
-          std::string("><VALUE.ARRAY><VALUE>x</VALUE><VALUE.NULL/></VALUE.ARRAY>")})
-        EXPECT_EQ(mistyped(bad), "P") << bad;
+    for (const std::string& name : test::sampleNames("arguments-as-stated/"))
+        EXPECT_EQ(mistyped(name), "") << name;
+    for (const std::string& name : test::sampleNames("arguments-of-another-type/"))
+        EXPECT_EQ(mistyped(name), "P") << name;
 }
 
 TEST(RequestHeadersTest, HaveToNameWhatIsCalled) {
@@ -193,7 +141,7 @@ core::InstanceValue oddValues() {
 
 TEST(ResponseWriterTest, WritesTextsAsClientsExpectThem) {
     IntrinsicResult result;
-    result.kind = ResultKind::Instance;
+    result.kind = cimxml::ResultKind::Instance;
     result.instances = {oddValues()};
     auto origins = std::make_shared<cimxml::Origins>();
     (*origins)["t_job"]["flag"] = "T_Root";
@@ -203,41 +151,16 @@ TEST(ResponseWriterTest, WritesTextsAsClientsExpectThem) {
     };
     const std::string message = written(result);
     EXPECT_EQ(test::faultsOf(message), "");
-    for (const char* part :
-         {"<PROPERTY NAME=\"Flag\" TYPE=\"boolean\" CLASSORIGIN=\"T_Root\"><VALUE>TRUE</VALUE></PROPERTY>",
-          "<VALUE>&lt;&amp;&gt;&quot;' \xC3\xBC</VALUE>",
-          "<PROPERTY NAME=\"Empty\" TYPE=\"string\"><VALUE></VALUE></PROPERTY>",
-          "<PROPERTY NAME=\"Null\" TYPE=\"uint8\"></PROPERTY>", "<VALUE>00000000000500.000000:000</VALUE>",
-          "<VALUE>20240229235959.000000+000</VALUE>", "<VALUE.ARRAY></VALUE.ARRAY>",
-          "<PROPERTY.ARRAY NAME=\"NullCodes\" TYPE=\"string\"></PROPERTY.ARRAY>",
-          "<PROPERTY.REFERENCE NAME=\"NullOwner\" REFERENCECLASS=\"T_Owner\"></PROPERTY.REFERENCE>"})
-        EXPECT_THAT(message, HasSubstr(part));
+    EXPECT_EQ(test::linesOf(message), test::readSample("responses/instance.xml"));
     // A client tells an empty list from a missing one.
     result.instances.clear();
     EXPECT_THAT(written(result), HasSubstr("<IRETURNVALUE></IRETURNVALUE>"));
-    EXPECT_THAT(written({}), Not(HasSubstr("IRETURNVALUE")));
+    EXPECT_THAT(written({}), ::testing::Not(HasSubstr("IRETURNVALUE")));
 }
 
 TEST(ResponseReaderTest, RefusesWhatIsNoResponse) {
-    const auto inside = [](const std::string& content) {
-        return "<CIM CIMVERSION='2.0' DTDVERSION='2.0'><MESSAGE ID='1' PROTOCOLVERSION='1.0'><SIMPLERSP>" +
-               content + "</SIMPLERSP></MESSAGE></CIM>";
-    };
-    for (const std::string& bad :
-         {std::string("<html/>"), inside("<IMETHODCALL NAME='X'/>"),
-          inside("<IMETHODRESPONSE NAME='X'><ERROR CODE='six'/></IMETHODRESPONSE>"),
-          inside("<IMETHODRESPONSE NAME='X'><IRETURNVALUE>" + nested(4) +
-                 "</IRETURNVALUE></IMETHODRESPONSE>"),
-          inside(
-              "<IMETHODRESPONSE NAME='X'><IRETURNVALUE><INSTANCE CLASSNAME='C'><PROPERTY NAME='P' "
-              "TYPE='uint8'/><PROPERTY NAME='p' TYPE='uint8'/></INSTANCE></IRETURNVALUE></IMETHODRESPONSE>"),
-          inside("<IMETHODRESPONSE NAME='X'><IRETURNVALUE><CLASS NAME='A{};&#10;#pragma include'/>"
-                 "</IRETURNVALUE></IMETHODRESPONSE>"),
-          inside("<IMETHODRESPONSE NAME='X'><IRETURNVALUE><NEW/></IRETURNVALUE></IMETHODRESPONSE>"),
-          inside("<METHODRESPONSE NAME='X'><RETURNVALUE><VALUE>x</VALUE></RETURNVALUE></METHODRESPONSE>"),
-          inside("<IMETHODRESPONSE NAME='X'><IRETURNVALUE><INSTANCE CLASSNAME='C'><PROPERTY NAME='P' "
-                 "TYPE='uint8'><VALUE>300</VALUE></PROPERTY></INSTANCE></IRETURNVALUE></IMETHODRESPONSE>")})
-        EXPECT_THROW(cimxml::readResponse(bad), WireError) << bad;
+    for (const std::string& name : test::sampleNames("refused-responses/"))
+        EXPECT_THROW(cimxml::readResponse(test::readSample(name)), WireError) << name;
 }
 
 }  // namespace

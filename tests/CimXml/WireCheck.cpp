@@ -2,6 +2,7 @@
 #include "CimXml/WireCheck.h"
 
 #include <filesystem>
+#include <regex>
 #include <set>
 #include <string_view>
 
@@ -34,11 +35,15 @@ std::string readSample(const std::string& name) {
     return {bytes.begin(), bytes.end()};
 }
 
-std::set<std::string> sampleNames() {
+std::set<std::string> sampleNames(const std::string& folder) {
     std::set<std::string> names;
-    for (const auto& entry : fs::directory_iterator(kFolder / "samples"))
-        names.insert(entry.path().filename());
+    for (const auto& entry : fs::directory_iterator(kFolder / "samples" / folder))
+        if (entry.is_regular_file()) names.insert(folder + entry.path().filename().string());
     return names;
+}
+
+std::string linesOf(const std::string& message) {
+    return std::regex_replace(message, std::regex("><"), ">\n<");
 }
 
 std::string faultsOf(const std::string& message) {

@@ -96,55 +96,21 @@ TEST_F(DispatcherTest, AnswersEachMistakeByItsStatus) {
     EXPECT_EQ(statusIn(invoke(a, "Work", {})), 28);
 }
 
-/// An element of a class: a star marks what comes from a superclass, "@" the class that first declared it.
-template <class Element>
-std::string textOf(const Element& element) {
-    std::string text = element.name;
-    if constexpr (requires { element.origin; }) {
-        if (element.isPropagated) text += "*";
-        if (!element.origin.empty()) text += "@" + element.origin;
-    }
-    for (const core::Qualifier& each : element.qualifiers)
-        text += " " + each.name + (each.isPropagated ? "*" : "");
-    return text + "\n";
-}
-
-/// The class as a client reads it off the wire.
-std::string classText(const cimxml::Response& response) {
-    const cimxml::Response read = cimxml::readResponse(cimxml::writeResponse(response));
-    const core::ClassDeclaration shown = std::get<IntrinsicResult>(read.content).classes.at(0);
-    std::string text = textOf(shown);
-    for (const core::PropertyDeclaration& property : shown.properties)
-        text += textOf(property);
-    for (const core::MethodDeclaration& method : shown.methods) {
-        text += textOf(method);
-        for (const core::ParameterDeclaration& parameter : method.parameters)
-            text += " " + textOf(parameter);
-    }
-    return text;
-}
-
 TEST_F(DispatcherTest, ShowsClasses) {
     const cimxml::Parameter gadget{"ClassName", ClassName{"test_gadget"}};
     const cimxml::Parameter whole{"LocalOnly", "FALSE"};
-    const std::pair<Given, const char*> table[] = {
-        {{gadget},
-         "Test_Gadget\nID Key Override\nNumber Key\nMade\nWork Description ValueMap Values\n"
-         " Job In Out\n Text In\n Numbers In Description ValueMap Values\n Echo In Out\n"
-         "NotImplemented\n"},
-        {{gadget, whole},
-         "Test_Gadget Description*\nID Key Override Description*\nCaption*\n"
-         "Codes* Description* ValueMap* Values*\nNumber Key\nMade\n"
-         "Work Description ValueMap Values\n Job In Out\n Text In\n"
-         " Numbers In Description ValueMap Values\n Echo In Out\nNotImplemented\n"},
-        {{gadget, whole, {"IncludeQualifiers", "FALSE"}, {"IncludeClassOrigin", "TRUE"}},
-         "Test_Gadget\nID@Test_Thing\nCaption*@Test_Thing\nCodes*@Test_Thing\nNumber@Test_Gadget\n"
-         "Made@Test_Gadget\nWork@Test_Gadget\n Job\n Text\n Numbers\n Echo\nNotImplemented@Test_Gadget\n"},
-        {{{"ClassName", ClassName{"Test_Link"}}, {"PropertyList", std::vector<std::string>{"to"}}},
-         "Test_Link Association\nTo Key\n"},
-    };
-    for (const auto& [parameters, expected] : table)
-        EXPECT_EQ(classText(send("GetClass", parameters)), expected);
+    const std::pair<const char*, Given> table[] = {
+        {"class-by-itself", {gadget}},
+        {"class-with-what-it-inherits", {gadget, whole}},
+        {"class-with-origins",
+         {gadget, whole, {"IncludeQualifiers", "FALSE"}, {"IncludeClassOrigin", "TRUE"}}},
+        {"class-with-one-property",
+         {{"ClassName", ClassName{"Test_Link"}}, {"PropertyList", std::vector<std::string>{"to"}}}}};
+    for (const auto& [name, parameters] : table) {
+        const std::string text = cimxml::writeResponse(send("GetClass", parameters));
+        EXPECT_EQ(test::linesOf(text), test::readSample("responses/" + std::string(name) + ".xml"));
+        EXPECT_EQ(cimxml::writeResponse(cimxml::readResponse(text)), text) << "all of it is read";
+    }
 
     EXPECT_EQ(call("EnumerateClassNames", {}).classNames,
               (std::vector<std::string>{"Test_Link", "Test_Thing"}));
@@ -296,6 +262,76 @@ TEST_F(DispatcherTest, LeavesOneAuditLineForEachChangeAndRefusal) {
     EXPECT_LT(lines[3].text.size(), 1300U);
     EXPECT_NE(lines[3].text.find(std::string(64, 'u') + R"(\..." address="192.0.2.1")"), std::string::npos);
     EXPECT_TRUE(lines[3].text.ends_with(R"(uu\...")")) << lines[3].text;
+}
+
+TEST_F(DispatcherTest, GivesWhatItHasTakenOutOfAnEnumeration) {
+    for (unsigned int i = 0; i < 40; ++i)
+        m_agent.add(std::string(3000, '"'), i);
+    const Given all{{"ClassName", ClassName{"Test_Gadget"}}};
+    EXPECT_THROW(send("EnumerateInstances", all), host::OverBudget) << "a quote takes six bytes of text";
+    const std::string context = output(call("OpenEnumerateInstances", all), "EnumerationContext");
+    EXPECT_EQ(call("PullInstancesWithPath", {{"EnumerationContext", context}, {"MaxObjectCount", "100"}})
+                  .instances.size(),
+              43U);
+}
+
+TEST_F(DispatcherTest, RepeatsNoLongTextOfTheRequest) {
+    const std::string quotes(200000, '"');
+    for (const char* space : {"root/cimv2", "root/other"}) {
+        CimPath path("test_gadget", {{"number", "1"}, {"id", quotes}});
+        path.setNamespace(space);
+        EXPECT_LT(description(send("GetInstance", {{"InstanceName", path}})).size(), 500U) << space;
+    }
+    std::string umlauts = "x";
+    for (int i = 0; i < 3000; ++i)
+        umlauts += "\u00e4";
+    const auto unknown = send("EnumerateInstances", {{"ClassName", ClassName{umlauts}}});
+    EXPECT_EQ(description(unknown).size(), 1999U) << "half a character would end the answer";
+}
+
+TEST_F(DispatcherTest, CarriesOutNothingForAnotherNamespace) {
+    CimPath elsewhere = gadget("a", "1");
+    elsewhere.setNamespace("root/other");
+    // Where a message has a name alone, a client of another kind sends the whole path.
+    const auto statusOf = [&](const char* operation, const char* parameter) {
+        const cimxml::Request request{
+            "1", cimxml::IntrinsicCall{operation, "ROOT/cimv2", {{parameter, elsewhere}}}};
+        host::AnswerCharge charge = m_dispatcher.charge("admin");
+        return statusIn(m_dispatcher.dispatch(request, m_caller, charge));
+    };
+    EXPECT_EQ(statusOf("GetInstance", "InstanceName"), 6);
+    EXPECT_EQ(statusOf("DeleteInstance", "InstanceName"), 6);
+    EXPECT_EQ(statusOf("Associators", "ObjectName"), 6);
+    elsewhere.setNamespace("ROOT/CIMV2");
+    EXPECT_EQ(statusOf("GetInstance", "InstanceName"), 0);
+    elsewhere.setNamespace("root/other");
+    const auto job = [&](const CimPath& path) {
+        return statusIn(invoke(gadget("a", "1"), "Work",
+                               {argument("Text", "x"), argument("Job", path, core::CimType::Reference)}));
+    };
+    EXPECT_EQ(job(elsewhere), 4);
+    EXPECT_EQ(job(gadget("a", "1")), 0);
+}
+
+TEST_F(DispatcherTest, CountsTheRefusalsOfAFlood) {
+    const test::LogLevelGuard level(1);
+    test::SyslogCapture::clear();
+    m_caller.isAdministrator = false;
+    for (int i = 0; i < 25; ++i)
+        invoke(gadget("a", "1"), "Work", {});
+    m_caller = {"other", true, "localhost", "192.0.2.1"};
+    invoke(gadget("a", "1"), "Work", {});
+    EXPECT_EQ(test::SyslogCapture::count("[audit]"), 21U);
+    host::AuditTrail trail;
+    const auto now = host::AuditTrail::Clock::now();
+    for (int i = 0; i < 25; ++i)
+        trail.refused({"a", "192.0.2.1", "Work", "t", "denied: x"}, {}, now);
+    trail.writeNumbers(now + std::chrono::seconds(59));
+    EXPECT_EQ(test::SyslogCapture::count("[audit]"), 41U);
+    trail.writeNumbers(now + std::chrono::seconds(60));
+    EXPECT_EQ(test::SyslogCapture::lines().back().text,
+              "[audit] user=\"a\" address=\"192.0.2.1\" operation=\"Work\" target=\"\" arguments=\"\" "
+              "outcome=\"denied: 5 more within a minute\"");
 }
 
 }  // namespace
