@@ -10,29 +10,24 @@ using core::CimScalar;
 using core::CimType;
 
 TEST(CimValueTest, KeepsNumbersToTheRangeOfTheirType) {
-    struct Row {
-        CimType type;
-        const char* text;
-        bool accepted;
+    const std::tuple<CimType, const char*, bool> table[] = {
+        {CimType::Uint8, "256", false},
+        {CimType::Uint8, "-1", false},
+        {CimType::Uint16, " 0xFFFF ", true},
+        {CimType::Sint8, "-128", true},
+        {CimType::Sint8, "-129", false},
+        {CimType::Uint32, "5x", false},
+        {CimType::Uint64, "18446744073709551615", true},
+        {CimType::Uint64, "18446744073709551616", false},
+        {CimType::Sint64, "-9223372036854775808", true},
+        {CimType::Boolean, "tRuE", true},
+        {CimType::Boolean, "1", false},
+        {CimType::Real64, "1.5e+03", true},
+        {CimType::Datetime, "tomorrow", false},
+        {CimType::Reference, "no path!", false},
     };
-    for (const Row& row : {
-             Row{CimType::Uint8, "256", false},
-             Row{CimType::Uint8, "-1", false},
-             Row{CimType::Uint16, " 0xFFFF ", true},
-             Row{CimType::Sint8, "-128", true},
-             Row{CimType::Sint8, "-129", false},
-             Row{CimType::Uint32, "5x", false},
-             Row{CimType::Uint64, "18446744073709551615", true},
-             Row{CimType::Uint64, "18446744073709551616", false},
-             Row{CimType::Sint64, "-9223372036854775808", true},
-             Row{CimType::Boolean, "tRuE", true},
-             Row{CimType::Boolean, "1", false},
-             Row{CimType::Real64, "1.5e+03", true},
-             Row{CimType::Datetime, "tomorrow", false},
-             Row{CimType::Reference, "no path!", false},
-         }) {
-        EXPECT_EQ(core::parseScalar(row.type, row.text).has_value(), row.accepted) << row.text;
-    }
+    for (const auto& [type, text, isAccepted] : table)
+        EXPECT_EQ(core::parseScalar(type, text).has_value(), isAccepted) << text;
     EXPECT_EQ(std::get<std::uint64_t>(*core::parseScalar(CimType::Uint16, "0x1F4")), 500U);
 }
 
@@ -92,27 +87,21 @@ TEST(CimPathTest, KeepsATextThatDoesNotParseAndNamesNothing) {
 }
 
 TEST(CimPathTest, ComparesNamesWithoutCaseAndValuesByType) {
-    struct Row {
-        const char* left;
-        const char* right;
-        bool same;
+    const std::tuple<std::string, std::string, bool> table[] = {
+        {"root/cimv2:Thing.Name=\"a\",No=5", "ROOT/CIMV2:THING.no=5,NAME=\"a\"", true},
+        {"Thing.Name=\"a\"", "Thing.Name=\"A\"", false},
+        {"Thing.No=5", "Thing.No=\"5\"", false},
+        {"Thing.No=5", "Thing.No=0x5", true},
+        {"Thing.No=1.5e3", "Thing.No=1500.0", true},
+        {"Thing.No=5", "Thing.No=5,More=1", false},
+        {"Thing.Name=\"a\"", "root/x:Thing.Name=\"a\"", true},
+        {"root/y:Thing.Name=\"a\"", "root/x:Thing.Name=\"a\"", false},
+        {"//h/root/x:Thing.Name=\"a\"", "//other/root/x:Thing.Name=\"a\"", true},
+        {"Thing.Flag=true", "Thing.Flag=TRUE", true},
     };
-    for (const Row& row : {
-             Row{"root/cimv2:Thing.Name=\"a\",No=5", "ROOT/CIMV2:THING.no=5,NAME=\"a\"", true},
-             Row{"Thing.Name=\"a\"", "Thing.Name=\"A\"", false},
-             Row{"Thing.No=5", "Thing.No=\"5\"", false},
-             Row{"Thing.No=5", "Thing.No=0x5", true},
-             Row{"Thing.No=1.5e3", "Thing.No=1500.0", true},
-             Row{"Thing.No=5", "Thing.No=5,More=1", false},
-             Row{"Thing.Name=\"a\"", "root/x:Thing.Name=\"a\"", true},
-             Row{"root/y:Thing.Name=\"a\"", "root/x:Thing.Name=\"a\"", false},
-             Row{"//h/root/x:Thing.Name=\"a\"", "//other/root/x:Thing.Name=\"a\"", true},
-             Row{"Thing.Flag=true", "Thing.Flag=TRUE", true},
-         }) {
-        const CimPath left{std::string(row.left)};
-        const CimPath right{std::string(row.right)};
-        EXPECT_EQ(left.isSameObjectAs(right), row.same) << row.left << " / " << row.right;
-        EXPECT_EQ(right.isSameObjectAs(left), row.same) << row.left << " / " << row.right;
+    for (const auto& [left, right, isSame] : table) {
+        EXPECT_EQ(CimPath(left).isSameObjectAs(CimPath(right)), isSame) << left << " / " << right;
+        EXPECT_EQ(CimPath(right).isSameObjectAs(CimPath(left)), isSame) << left << " / " << right;
     }
     // A reference as a value, and the same as the quoted text that a path holds.
     const CimPath value("Link", {{"From", core::CimScalar(CimPath(std::string("Thing.Name=\"x\"")))}});

@@ -13,7 +13,6 @@ namespace {
 
 namespace fs = std::filesystem;
 using test::CallResult;
-using utils::FirmwareType;
 
 /// Between two steps of an update. The file is looked at, opened and read; each is announced.
 enum class When { BeforeOpening = 2, BeforeReading = 3, BeforePreparation, BeforeWrite };
@@ -44,7 +43,7 @@ class ChangingFileTest : public test::UpdateTest {
         return result;
     }
     static std::vector<uint8_t> rom(uint16_t revision) {
-        return test::madeRom({{FirmwareType::PXE, revision}, {FirmwareType::UEFI, revision}});
+        return test::madeRom({{utils::FirmwareType::PXE, revision}, {utils::FirmwareType::UEFI, revision}});
     }
 
     bool m_changed = false;
@@ -65,41 +64,36 @@ TEST_F(ChangingFileTest, WhatWasReadAndVerifiedIsWrittenWholeOrNothingIs) {
             make();
         };
     };
-    // The method's answer and the revision then in the flash.
-    struct Row {
-        const char* change;
-        std::function<void()> make;
-        const char* beforeOpening;
-        const char* beforeReading;
-    };
+    // The method's answer and the revision then in the flash: before the opening, and before the reading.
     constexpr const char* kOld = "4096/2";
     constexpr const char* kNew = "4096/3";
-    for (const Row& row : std::vector<Row>{
-             {"truncated", [this] { fs::resize_file(m_path, 700); }, "5/1", "2/1"},
-             {"emptied", [this] { fs::resize_file(m_path, 0); }, "5/1", "2/1"},
-             {"extended", [this] { fs::resize_file(m_path, 9000); }, kOld, kOld},
-             {"replaced", replaceBy(rom(3)), kNew, kOld},
-             {"replaced by a longer one", replaceBy(longer), kNew, kOld},
-             {"unlinked", inItsPlace([] {}), "5/1", kOld},
-             {"a FIFO", inItsPlace([this] { mkfifo(m_path.c_str(), 0600); }), "5/1", kOld},
-             {"a device", inItsPlace([this] { fs::create_symlink("/dev/zero", m_path); }), "5/1", kOld},
-             {"a folder", inItsPlace([this] { fs::create_directory(m_path); }), "5/1", kOld},
-         }) {
+    const std::tuple<const char*, std::function<void()>, const char*, const char*> table[] = {
+        {"truncated", [this] { fs::resize_file(m_path, 700); }, "5/1", "2/1"},
+        {"emptied", [this] { fs::resize_file(m_path, 0); }, "5/1", "2/1"},
+        {"extended", [this] { fs::resize_file(m_path, 9000); }, kOld, kOld},
+        {"replaced", replaceBy(rom(3)), kNew, kOld},
+        {"replaced by a longer one", replaceBy(longer), kNew, kOld},
+        {"unlinked", inItsPlace([] {}), "5/1", kOld},
+        {"a FIFO", inItsPlace([this] { mkfifo(m_path.c_str(), 0600); }), "5/1", kOld},
+        {"a device", inItsPlace([this] { fs::create_symlink("/dev/zero", m_path); }), "5/1", kOld},
+        {"a folder", inItsPlace([this] { fs::create_directory(m_path); }), "5/1", kOld},
+    };
+    for (const auto& [change, make, beforeOpening, beforeReading] : table) {
         for (const When when :
              {When::BeforeOpening, When::BeforeReading, When::BeforePreparation, When::BeforeWrite}) {
-            SCOPED_TRACE(std::string(row.change) + " at step " + std::to_string(static_cast<int>(when)));
+            SCOPED_TRACE(std::string(change) + " at step " + std::to_string(static_cast<int>(when)));
             fs::remove_all(m_path);
             fs::remove_all(m_adapters.stateDirectory());
             const std::string uri = file("image.rom", rom(2));
-            arrange(when, row.make);
+            arrange(when, make);
             test::SyslogCapture::clear();
             const CallResult result = installAndEnd(uri);
             EXPECT_TRUE(m_changed);
             EXPECT_EQ(claim(), "");
             const std::string outcome = std::to_string(result.returnValue) + '/' +
                                         test::componentsOf("eth0").substr(std::string("IMG_PXE ").size(), 1);
-            EXPECT_EQ(outcome, when == When::BeforeOpening   ? row.beforeOpening
-                               : when == When::BeforeReading ? row.beforeReading
+            EXPECT_EQ(outcome, when == When::BeforeOpening   ? beforeOpening
+                               : when == When::BeforeReading ? beforeReading
                                                              : kOld);
             EXPECT_EQ(test::SyslogCapture::contains("Job cannot read the URI for '"), outcome == "2/1");
             test::count("files changed on the way");
@@ -117,6 +111,7 @@ TEST_F(ChangingFileTest, OddPathsAreRefusedOrReadLikeAnyOther) {
     for (const std::string& uri : {
              std::string("file:///proc/self/maps"),  // says that it is empty
              std::string("file:///proc/kcore"),
+             std::string("file:///dev/null"),
              std::string("file:///dev/zero"),
              "file://" + huge,
              "file://" + larger,
@@ -130,8 +125,9 @@ TEST_F(ChangingFileTest, OddPathsAreRefusedOrReadLikeAnyOther) {
         EXPECT_EQ(claim(), "") << uri.substr(0, 80);
         test::count("bad inputs tried");
     }
-    const std::string oddName = file("new\nline %n \x01.rom", test::readTestFile(good.substr(7)));
-    EXPECT_EQ(installAndEnd(oddName).returnValue, 4096U);
+    const std::string oddName = m_folder / "new\nline %n \x01.rom";
+    fs::create_symlink(good.substr(7), oddName);
+    EXPECT_EQ(installAndEnd("file://" + oddName).returnValue, 4096U);
     expectUpdateWorks();
 }
 

@@ -48,34 +48,30 @@ namespace {
 
 TEST(LogTest, OpensAsTheEnvironmentSays) {
     const LogLevelGuard guard(-1);
-    const struct {
-        const char* level;
-        const char* copy;
-        int foundLevel;
-        int foundOptions;
-    } rows[] = {{nullptr, nullptr, 1, LOG_CONS},  // as it is at first
-                {"", "", 1, LOG_CONS},
-                {"3", "stderr", 1, LOG_PERROR},
-                {"00", "stderr2", 0, LOG_CONS},
-                {"2x", "std", 2, LOG_CONS}};
-    for (const auto& row : rows) {
+    const std::tuple<const char*, const char*, int, int> table[] = {
+        {nullptr, nullptr, 1, LOG_CONS},  // as it is at first
+        {"", "", 1, LOG_CONS},
+        {"3", "stderr", 1, LOG_PERROR},
+        {"00", "stderr2", 0, LOG_CONS},
+        {"2x", "std", 2, LOG_CONS}};
+    for (const auto& [level, copy, foundLevel, foundOptions] : table) {
         SyslogCapture::clear();
         utils::logLevel = -1;
-        if (row.level != nullptr) setenv("TARVEL_SMASHv2_LOG_LEVEL", row.level, 1);
-        if (row.copy != nullptr) setenv("QUENX_LOG", row.copy, 1);
+        if (level != nullptr) setenv("TARVEL_SMASHv2_LOG_LEVEL", level, 1);
+        if (copy != nullptr) setenv("QUENX_LOG", copy, 1);
         utils::writeDebugLog("f", "g", 1, "debug text");
         utils::writeErrorLog("f", "g", 1, "error text");
 
-        SCOPED_TRACE(row.level == nullptr ? "(unset)" : row.level);
-        EXPECT_EQ(utils::logLevel, row.foundLevel);
+        SCOPED_TRACE(level == nullptr ? "(unset)" : level);
+        EXPECT_EQ(utils::logLevel, foundLevel);
         EXPECT_EQ(SyslogCapture::opening().identity, "quenx");
-        EXPECT_EQ(SyslogCapture::opening().options, row.foundOptions);
+        EXPECT_EQ(SyslogCapture::opening().options, foundOptions);
         EXPECT_EQ(SyslogCapture::opening().facility, LOG_USER);
         const auto lines = SyslogCapture::lines();
-        EXPECT_EQ(lines.at(0).text, "Opening log, level=" + std::to_string(row.foundLevel));
+        EXPECT_EQ(lines.at(0).text, "Opening log, level=" + std::to_string(foundLevel));
         EXPECT_TRUE(lines.at(0).priority == LOG_NOTICE && lines.at(1).priority == LOG_NOTICE);
-        EXPECT_EQ(SyslogCapture::count("[debug] \"debug text\" (g@f:1)"), row.foundLevel == 2 ? 1U : 0U);
-        EXPECT_EQ(SyslogCapture::count("[error] \"error text\" (g@f:1)"), row.foundLevel >= 1 ? 1U : 0U);
+        EXPECT_EQ(SyslogCapture::count("[debug] \"debug text\" (g@f:1)"), foundLevel == 2 ? 1U : 0U);
+        EXPECT_EQ(SyslogCapture::count("[error] \"error text\" (g@f:1)"), foundLevel >= 1 ? 1U : 0U);
     }
     unsetenv("TARVEL_SMASHv2_LOG_LEVEL");
     unsetenv("QUENX_LOG");

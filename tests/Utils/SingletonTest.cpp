@@ -9,6 +9,7 @@
 #include <vector>
 
 #include "Support/SyslogCapture.h"
+#include "Support/Together.h"
 #include "Utils/Os/Linux/LinuxOSLocker.h"
 
 using os::OSLocker;
@@ -55,11 +56,7 @@ TEST(SingletonTest, NeverBringsBackADeadInstanceAfterDestructionOutOfOrder) {
 }
 
 TEST(AutoSingletonTest, MakesOneWholeInstanceOnTwoFirstCallsThatANewerOneHides) {
-    {
-        std::vector<std::jthread> threads;
-        for (int i = 0; i < 8; ++i)
-            threads.emplace_back([] { EXPECT_TRUE(Slow::getInstance()->isWhole); });
-    }
+    test::together(std::vector<std::function<void()>>(8, [] { EXPECT_TRUE(Slow::getInstance()->isWhole); }));
     EXPECT_EQ(Slow::constructed, 1);
     Slow* const created = Slow::getInstance();
     {

@@ -39,10 +39,7 @@ std::string failureOf(const Fields& f) {
 }  // namespace
 
 TEST(TimeTest, TakesCalendarFieldsAsUtcInEveryZone) {
-    const struct {
-        Fields fields;
-        std::uint64_t seconds;
-    } rows[] = {
+    const std::pair<Fields, std::uint64_t> table[] = {
         {{1970, 1, 1, 0, 0, 0}, 0},
         {{1970, 6, 15, 0, 0, 0}, 14256000},    // Dublin kept UTC+1 all year
         {{1971, 6, 1, 12, 0, 0}, 44625600},    // Monrovia was 44 minutes and a half off
@@ -53,9 +50,9 @@ TEST(TimeTest, TakesCalendarFieldsAsUtcInEveryZone) {
         setenv("TZ", zone, 1);
         tzset();
         SCOPED_TRACE(zone);
-        for (const auto& row : rows) {
-            EXPECT_EQ(make(row.fields).getSeconds(), row.seconds);
-            EXPECT_EQ(decode(make(row.fields)), row.fields);
+        for (const auto& [fields, seconds] : table) {
+            EXPECT_EQ(make(fields).getSeconds(), seconds);
+            EXPECT_EQ(decode(make(fields)), fields);
         }
         // Before 1970 the count wraps, by the same amount everywhere.
         EXPECT_EQ(make({1900, 1, 1, 0, 0, 0}), Time(-2208988800ULL * 1000000));
@@ -66,10 +63,7 @@ TEST(TimeTest, TakesCalendarFieldsAsUtcInEveryZone) {
 }
 
 TEST(TimeTest, ChecksFieldsInOrder) {
-    const struct {
-        Fields fields;
-        const char* failure;
-    } rows[] = {
+    const std::pair<Fields, const char*> table[] = {
         {{1899, 13, 0, 0, 0, 0}, "wrong year value 1899"},
         {{2012, 0, 40, 0, 0, 0}, "wrong month value 0"},
         {{2012, 1, 0, 99, 0, 0}, "wrong day value 0"},
@@ -80,8 +74,8 @@ TEST(TimeTest, ChecksFieldsInOrder) {
         {{2012, 12, 31, 23, 60, 99}, "wrong minute value 60"},
         {{2012, 12, 31, 23, 59, 60}, "wrong second value 60"},
     };
-    for (const auto& row : rows)
-        EXPECT_EQ(failureOf(row.fields), row.failure);
+    for (const auto& [fields, failure] : table)
+        EXPECT_EQ(failureOf(fields), failure);
     EXPECT_TRUE(Time::isLeapYear(2000) && Time::isLeapYear(2024));
     EXPECT_FALSE(Time::isLeapYear(1900) || Time::isLeapYear(2023));
 }

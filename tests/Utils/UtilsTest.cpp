@@ -16,9 +16,3 @@ TEST(UtilsTest, FoldsLettersOfAsciiOnly) {
     EXPECT_FALSE(utils::equalsIgnoringCase("a", "ab"));
     EXPECT_FALSE(utils::equalsIgnoringCase("[", "{"));
 }
-
-TEST(UtilsTest, KeepsEmptyPiecesWhenSplitting) {
-    using utils::split;
-    EXPECT_EQ(split("::a:", ':'), (utils::StringArray{"", "", "a", ""}));
-    EXPECT_EQ(split("", ':'), (utils::StringArray{""}));
-}

@@ -12,7 +12,6 @@ namespace {
 
 namespace fs = std::filesystem;
 using Rows = std::vector<std::string>;
-using utils::FirmwareType;
 
 /// Two firmware directories, and adapters that carry nothing.
 class FirmwareTest : public test::UpdateTest {
@@ -25,7 +24,8 @@ class FirmwareTest : public test::UpdateTest {
 
     /// Kinds of ROM that differ by ids or version, so that each is a firmware of its own.
     static std::vector<std::uint8_t> rom(std::uint32_t version, std::uint16_t device = 0x1041) {
-        return test::madeRom({{FirmwareType::PXE, version}, {FirmwareType::UEFI, 0}}, 0x1af4, device);
+        return test::madeRom({{utils::FirmwareType::PXE, version}, {utils::FirmwareType::UEFI, 0}}, 0x1af4,
+                             device);
     }
 
     Rows images() const { return table("Quenx_SoftwareIdentity", {"ElementName"}); }

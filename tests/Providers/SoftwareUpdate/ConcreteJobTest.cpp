@@ -12,7 +12,6 @@
 
 namespace {
 
-using test::madeRom;
 using utils::FirmwareType;
 
 class ConcreteJobTest : public test::UpdateTest {
@@ -95,31 +94,28 @@ TEST_F(ConcreteJobTest, MayBeUsedByAnyThreadAtOnce) {
 TEST_F(ConcreteJobTest, TheBootTypeStaysUnlessAnUpdateRemovesIscsi) {
     // The update that removes it is in the fault table.
     m_backend->hook = [](const std::string& operation) { EXPECT_NE(operation, "setBootType"); };
-    const auto iscsi = madeRom({{FirmwareType::iSCSI, 2}, {FirmwareType::UEFI, 1}}, 0x15ad, 0x07b0);
+    const auto iscsi = test::madeRom({{FirmwareType::iSCSI, 2}, {FirmwareType::UEFI, 1}}, 0x15ad, 0x07b0);
     run(*makeJob("eth4", file("iscsi.rom", iscsi)));
     run(*makeJob());
 }
 
 TEST_F(ConcreteJobTest, ReadsTargetTypesFromTheOptions) {
-    struct Row {
-        std::vector<std::uint16_t> options;
-        std::vector<std::string> values;
-        std::vector<FirmwareType> types;
-    };
     using enum FirmwareType;
-    for (const Row& row : std::vector<Row>{
-             {{5}, {"IMG_PXE"}, {}},
-             {{32768}, {" IMG_PXE\t+ IMG_UEFI "}, {PXE, UEFI}},
-             {{32768}, {"IMG_UEFI+IMG_PXE+IMG_UEFI"}, {UEFI, PXE, UEFI}},
-             {{32768}, {"IMG_PXE+"}, {PXE, None}},
-             {{32768}, {""}, {None}},
-             {{5, 32768}, {"IMG_PXE"}, {}},
-             {{32768, 5, 32768}, {"IMG_CLP", "x", "IMG_FCoE+IMG_iSCSI"}, {CLP, FCoE, iSCSI}},
-             {{32768, 32768}, {"IMG_CLP"}, {CLP}},  // the second has no value
-         }) {
-        m_options = row.options;
-        m_values = row.values;
-        EXPECT_EQ(Quenx_ConcreteJob::getTargetTypes(m_options, m_values), row.types);
+    const std::tuple<std::vector<std::uint16_t>, std::vector<std::string>, std::vector<FirmwareType>>
+        table[] = {
+            {{5}, {"IMG_PXE"}, {}},
+            {{32768}, {" IMG_PXE\t+ IMG_UEFI "}, {PXE, UEFI}},
+            {{32768}, {"IMG_UEFI+IMG_PXE+IMG_UEFI"}, {UEFI, PXE, UEFI}},
+            {{32768}, {"IMG_PXE+"}, {PXE, None}},
+            {{32768}, {""}, {None}},
+            {{5, 32768}, {"IMG_PXE"}, {}},
+            {{32768, 5, 32768}, {"IMG_CLP", "x", "IMG_FCoE+IMG_iSCSI"}, {CLP, FCoE, iSCSI}},
+            {{32768, 32768}, {"IMG_CLP"}, {CLP}},  // the second has no value
+        };
+    for (const auto& [options, values, types] : table) {
+        m_options = options;
+        m_values = values;
+        EXPECT_EQ(Quenx_ConcreteJob::getTargetTypes(m_options, m_values), types);
     }
     EXPECT_TRUE(test::SyslogCapture::contains("\"Return result[3]=%d\""));
 }

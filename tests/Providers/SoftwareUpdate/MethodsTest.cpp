@@ -135,8 +135,12 @@ class MethodsTest : public test::UpdateTest {
             {fromUri("/no/scheme", m_port), 5, {invalid, "EInvalidUri:URI: /no/scheme is invalid"}},
             {fromUri("file:/one/slash", m_port), 5, {invalid}},
             {fromUri("https://host/image", m_port), 5, {invalid}},
-            {fromUri("file://" + m_folder.path(), m_port), 5, {missing}},
-            {fromUri("file:///no", m_port), 5, {missing, "EUriDoesNotExist:URI: file:///no is invalid"}},
+            {fromUri("file://" + m_folder.path(), m_port),
+             5,
+             {missing, "The specyfied URI " + m_folder.path() + " points to a directory"}},
+            {fromUri("file:///no", m_port),
+             5,
+             {missing, "Could not open the file /no", "EUriDoesNotExist:URI: file:///no is invalid"}},
             {fromUri(file("empty", {}), m_port), 5, {parameter}},
             {fromUri(file("cut", cut), m_port), 5, {parameter}},
             {fromUri("file://" + test::realRomPath("efi-rtl8139"), m_port), 4097, {unsupported}},
@@ -167,7 +171,7 @@ class MethodsTest : public test::UpdateTest {
         std::vector<Row> rows = {
             {fromUri(m_uri, nowhere), 5, {notFound + nowhere.toString() + "'"}},
             {fromUri(m_uri, noPath), 5, {notFound + noPath.toString() + "'"}},
-            {fromUri(m_uri, m_controller), kJobStarted},
+            {fromUri(m_uri, m_controller), kJobStarted, {"Output size of file: 2048"}},
             // For targets all speak alike.
             {fromUri(m_uri, service()), 4106, {noTarget}},
             {check(m_image, service()), 4106, {noTarget}},
@@ -177,12 +181,7 @@ class MethodsTest : public test::UpdateTest {
             {check(m_image, m_port), 0, checkedLines},
             {fromIdentity(m_image, m_port), kJobStarted, {"Creation of new job returns: 0"}},
         };
-        struct Resolved {
-            CimPath source;
-            CimPath target;
-            std::string line;
-        };
-        for (const auto& [source, target, line] : std::vector<Resolved>{
+        for (const auto& [source, target, line] : std::vector<std::tuple<CimPath, CimPath, std::string>>{
                  {missing, m_port, notFound + missing.toString() + "'"},
                  {m_port, m_port, noSource + m_port.toString() + "'"},
                  {installed, m_port,
@@ -281,34 +280,27 @@ TEST_F(MethodsTest, DecideByTheStatusOfThePreparation) {
         "EDowngradeDetected:Downgrade was detected for " + m_uri + ". Try to use FORCE_INSTALL option.";
     const std::string types =
         "EDowngradeDetected:The selected flash image cannot be used because it does not contain the same "
-        "image "
-        "types. Please select a flash file with matching image types.";
-    const struct {
-        int status;
-        bool isForced;
-        bool areDowngradesBanned;
-        std::uint32_t returnValue;
-        std::string line{};
-    } table[] = {
-        {1, true, false, 5, "EInvalidParameter:Invalid parameter detected for " + m_uri},
-        {2, true, false, 4097, "EAdapterNotSupported:Image " + m_uri + " is not supported for adapter eth0"},
-        {3, false, false, 4099, downgrade},
-        {3, true, true, kJobStarted},
-        {4, false, false, 4099, downgrade},
-        {4, true, false, kJobStarted},
-        {4, true, true, 4099, types},
-        {4, false, true, 4099, types},
-        {5, true, false, 4106, "ENotApplicableForTarget:Not applicable for " + m_uri},
-        {6, true, false, 2, "EUnspecifiedError:Unspecified error occurred for " + m_uri},
-        {7, false, false, kJobStarted},
-        {-1, false, false, kJobStarted},
+        "image types. Please select a flash file with matching image types.";
+    const Codes forced{5, 3};
+    const char* const ban = "OEMCustomizeable=5\n";
+    const std::tuple<int, Codes, const char*, std::uint32_t, Texts> table[] = {
+        {1, forced, "", 5, {"EInvalidParameter:Invalid parameter detected for " + m_uri}},
+        {2, forced, "", 4097, {"EAdapterNotSupported:Image " + m_uri + " is not supported for adapter eth0"}},
+        {3, {5}, "", 4099, {downgrade}},
+        {3, forced, ban, kJobStarted, {}},
+        {4, {5}, "", 4099, {downgrade}},
+        {4, forced, "", kJobStarted, {}},
+        {4, forced, ban, 4099, {types}},
+        {4, {5}, ban, 4099, {types}},
+        {5, forced, "", 4106, {"ENotApplicableForTarget:Not applicable for " + m_uri}},
+        {6, forced, "", 2, {"EUnspecifiedError:Unspecified error occurred for " + m_uri}},
+        {7, {5}, "", kJobStarted, {}},
+        {-1, {5}, "", kJobStarted, {}},
     };
-    for (const auto& row : table) {
-        const utils::SMASHv2Config config(
-            m_folder.write("policy.conf", row.areDowngradesBanned ? "OEMCustomizeable=5\n" : "\n"));
-        m_backend->prepareStatus = row.status;
-        expect({fromUri(m_uri, m_port, row.isForced ? Codes{5, 3} : Codes{5}), row.returnValue,
-                row.line.empty() ? Texts{} : Texts{row.line}});
+    for (const auto& [status, options, policy, returnValue, lines] : table) {
+        const utils::SMASHv2Config config(m_folder.write("policy.conf", policy));
+        m_backend->prepareStatus = status;
+        expect({fromUri(m_uri, m_port, options), returnValue, lines});
     }
 }
 
