@@ -18,7 +18,6 @@ using core::CimType;
 using core::CimValue;
 using core::InstanceValue;
 using core::PropertyFilter;
-using utils::FirmwareType;
 using Instances = std::vector<InstanceValue>;
 
 core::PropertyValue texts(const std::string& name, const std::vector<std::string>& values) {
@@ -118,8 +117,8 @@ class InstallVerbTest : public ::testing::Test {
     }
 
     test::TempFolder m_folder;
-    std::string m_file =
-        m_folder.write("new.rom", test::madeRom({{FirmwareType::PXE, 2}, {FirmwareType::UEFI, 1}}));
+    std::string m_file = m_folder.write(
+        "new.rom", test::madeRom({{utils::FirmwareType::PXE, 2}, {utils::FirmwareType::UEFI, 1}}));
     const std::shared_ptr<FakeService> m_service = std::make_shared<FakeService>();
     std::ostringstream m_out;
     std::ostringstream m_error;

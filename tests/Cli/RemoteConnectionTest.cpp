@@ -1,8 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 // Answers that no server should give.
-#include <arpa/inet.h>
 #include <gmock/gmock.h>
-#include <sys/socket.h>
 
 #include <array>
 #include <atomic>
@@ -11,7 +9,8 @@
 #include <thread>
 
 #include "Cli/Connection/Connection.h"
-#include "Utils/Os/Linux/linux.h"
+#include "Host/UnixSocket.h"
+#include "Support/TempFolder.h"
 
 namespace {
 
@@ -19,29 +18,20 @@ using ::testing::HasSubstr;
 using ::testing::StrEq;
 using ::testing::ThrowsMessage;
 
-/// Answers requests on loopback, one on each connection, as it is told.
-class LoopbackServer {
+/// Answers requests on a socket, one on each connection, as it is told.
+class ToldServer {
   public:
     /// Sends what it likes to the client's socket.
     using Answer = std::function<void(int client, const std::string& request)>;
 
-    explicit LoopbackServer(Answer answer)
-        : m_answer(std::move(answer)), m_socket(::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0)) {
-        sockaddr_in address{};
-        address.sin_family = AF_INET;
-        address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
-        socklen_t size = sizeof address;
-        auto* generic = reinterpret_cast<sockaddr*>(&address);
-        EXPECT_EQ(::bind(m_socket.number(), generic, size), 0);
+    explicit ToldServer(Answer answer) : m_answer(std::move(answer)) {
         EXPECT_EQ(::listen(m_socket.number(), 1), 0);
-        EXPECT_EQ(::getsockname(m_socket.number(), generic, &size), 0);
-        m_port = ntohs(address.sin_port);
         m_thread = std::jthread([this] { serve(); });
     }
     /// Answers with this response, whatever is asked.
-    explicit LoopbackServer(const std::string& response)
-        : LoopbackServer([response](int client, const std::string&) { sendResponse(client, response); }) {}
-    ~LoopbackServer() { ::shutdown(m_socket.number(), SHUT_RDWR); }
+    explicit ToldServer(const std::string& response)
+        : ToldServer([response](int client, const std::string&) { sendResponse(client, response); }) {}
+    ~ToldServer() { ::shutdown(m_socket.number(), SHUT_RDWR); }
 
     static bool sendBytes(int client, const std::string& bytes) {
         return ::send(client, bytes.data(), bytes.size(), MSG_NOSIGNAL) == static_cast<ssize_t>(bytes.size());
@@ -53,10 +43,8 @@ class LoopbackServer {
     }
 
     cli::Connection connect() const {
-        ::setenv("QUENXCTL_PASSWORD", "admin", 1);
         cli::ServerSettings settings;
-        settings.url.emplace("http://127.0.0.1:" + std::to_string(m_port));
-        settings.user = "admin";
+        settings.url.emplace("unix:" + (m_folder / "socket"));
         return cli::openServer(settings, [] { return false; });
     }
 
@@ -76,8 +64,8 @@ class LoopbackServer {
     }
 
     const Answer m_answer;
-    const os::Descriptor m_socket;
-    int m_port = 0;
+    const test::TempFolder m_folder;
+    const test::UnixSocket m_socket{SOCK_STREAM, m_folder / "socket"};
     std::jthread m_thread;
 };
 
@@ -108,7 +96,7 @@ TEST(RemoteConnectionTest, TakesNoAnswerForAnotherRequestsOrForNothing) {
     const std::string returned = "<RETURNVALUE><VALUE>0</VALUE></RETURNVALUE></METHODRESPONSE>";
     const char* const other = "The server's answer belongs to another request.";
     const auto call = [](const std::string& response) {
-        LoopbackServer(response).connect().operations->invokeMethod(core::CimPath("Y.Name=\"1\""), "X", {});
+        ToldServer(response).connect().operations->invokeMethod(core::CimPath("Y.Name=\"1\""), "X", {});
     };
     call(message("1", "<METHODRESPONSE NAME='x'>" + returned));
     const std::pair<std::string, const char*> table[] = {
@@ -119,9 +107,9 @@ TEST(RemoteConnectionTest, TakesNoAnswerForAnotherRequestsOrForNothing) {
          "The server's answer cannot be read: element METHODRESPONSE has no RETURNVALUE."}};
     for (const auto& row : table)
         EXPECT_THAT([&] { call(row.first); }, ThrowsMessage<cli::NoAnswer>(StrEq(row.second)));
-    const LoopbackServer server(message("1", "<METHODRESPONSE NAME='EnumerateInstanceNames'>" + returned));
+    const ToldServer server(message("1", "<METHODRESPONSE NAME='EnumerateInstanceNames'>" + returned));
     EXPECT_THROW(server.connect().operations->enumerateInstanceNames("Y"), cli::NoAnswer);
-    const LoopbackServer confused(
+    const ToldServer confused(
         message("1",
                 "<IMETHODRESPONSE NAME='GetInstance'><IRETURNVALUE><INSTANCE CLASSNAME='Y'><PROPERTY "
                 "NAME='name' TYPE='string'><VALUE>2</VALUE></PROPERTY></INSTANCE></IRETURNVALUE>"
@@ -145,11 +133,11 @@ TEST(RemoteConnectionTest, SendsAChangeOnce) {
     const core::CimPath path("Y.Name=\"1\"");
     for (const auto& row : table) {
         std::atomic<int> sent{0};
-        const LoopbackServer server([&](int client, const std::string& request) {
+        const ToldServer server([&](int client, const std::string& request) {
             // The library may connect again before it is kept from sending again.
             if (!request.empty()) ++sent;
             // The connection is kept; the next request on it is taken, and gets no answer.
-            LoopbackServer::sendBytes(client, "HTTP/1.1 200 OK\r\nContent-Length: 0\r\n\r\n");
+            ToldServer::sendBytes(client, "HTTP/1.1 200 OK\r\nContent-Length: 0\r\n\r\n");
             std::array<char, 4096> bytes{};
             ::recv(client, bytes.data(), bytes.size(), 0);
         });
@@ -167,8 +155,8 @@ std::string classBelow(const std::string& name, const std::string& superclass) {
 
 TEST(RemoteConnectionTest, BuildsNoEndlessChainsOfClasses) {
     const auto read = [](const std::string& classes) {
-        const LoopbackServer server(message("1", "<IMETHODRESPONSE NAME='EnumerateClasses'><IRETURNVALUE>" +
-                                                     classes + "</IRETURNVALUE></IMETHODRESPONSE>"));
+        const ToldServer server(message("1", "<IMETHODRESPONSE NAME='EnumerateClasses'><IRETURNVALUE>" +
+                                                 classes + "</IRETURNVALUE></IMETHODRESPONSE>"));
         server.connect().operations->enumerateClasses("", true);
     };
     read(classBelow("A", "B") + classBelow("B", "Elsewhere"));
@@ -187,9 +175,9 @@ TEST(RemoteConnectionTest, GivesUpAnswersWithoutEnd) {
     const std::string piece(std::size_t{1} << 20, ' ');
     std::atomic<int> sent{0};
     for (const std::string head : {"", "Content-Length: 10737418240\r\n"}) {
-        const LoopbackServer server([&](int client, const std::string&) {
-            LoopbackServer::sendBytes(client, "HTTP/1.1 200 OK\r\nConnection: close\r\n" + head + "\r\n");
-            while (LoopbackServer::sendBytes(client, piece))
+        const ToldServer server([&](int client, const std::string&) {
+            ToldServer::sendBytes(client, "HTTP/1.1 200 OK\r\nConnection: close\r\n" + head + "\r\n");
+            while (ToldServer::sendBytes(client, piece))
                 ++sent;
         });
         EXPECT_THAT(
@@ -198,12 +186,12 @@ TEST(RemoteConnectionTest, GivesUpAnswersWithoutEnd) {
     }
     EXPECT_LT(sent, 128);
     // Nor does a list come to an end because its pieces are small.
-    const LoopbackServer server([](int client, const std::string& request) {
+    const ToldServer server([](int client, const std::string& request) {
         const auto valueOf = [&](const std::string& name) {
             const std::size_t start = request.find(name + "=\"") + name.size() + 2;
             return request.substr(start, request.find('"', start) - start);
         };
-        LoopbackServer::sendResponse(
+        ToldServer::sendResponse(
             client, message(valueOf("MESSAGE ID"),
                             "<IMETHODRESPONSE NAME='" + valueOf("IMETHODCALL NAME") +
                                 "'><IRETURNVALUE></IRETURNVALUE><PARAMVALUE NAME='EndOfSequence' "
@@ -217,10 +205,10 @@ TEST(RemoteConnectionTest, GivesUpAnswersWithoutEnd) {
 
 TEST(RemoteConnectionTest, ReadsAListWholeFromAServerWithoutPieces) {
     int requests = 0;
-    const LoopbackServer server([&](int client, const std::string& request) {
+    const ToldServer server([&](int client, const std::string& request) {
         const std::string id = std::to_string(++requests);
         const bool isWhole = request.find("\"EnumerateInstanceNames\"") != std::string::npos;
-        LoopbackServer::sendResponse(
+        ToldServer::sendResponse(
             client,
             message(id, isWhole ? "<IMETHODRESPONSE NAME='EnumerateInstanceNames'><IRETURNVALUE>"
                                   "<INSTANCENAME CLASSNAME='Y'/></IRETURNVALUE></IMETHODRESPONSE>"

@@ -7,7 +7,6 @@
 #include <ctime>
 #include <filesystem>
 #include <fstream>
-#include <thread>
 
 #include "Host/Authentication/PasswordChecker.h"
 #include "Host/Daemon/CommandLine.h"
@@ -17,6 +16,7 @@
 #include "Host/Server/ServerCertificate.h"
 #include "Host/UnixSocket.h"
 #include "Support/TempFolder.h"
+#include "Support/Together.h"
 
 namespace {
 
@@ -232,14 +232,13 @@ TEST(PasswdTest, LosesNoChangeThatOthersMake) {
     for (int i = 0; i < 8; ++i)
         users["user" + std::to_string(i)] = {"$x", true};
     host::writeUsersFile(file, users);
-    std::vector<std::thread> threads;
+    std::vector<std::function<void()>> removals;
     for (const auto& [name, entry] : users)
-        threads.emplace_back([&, name = name] {
+        removals.emplace_back([&, name = name] {
             EXPECT_EQ(host::runPasswd({.user = name, .usersFile = file, .isRemoval = true, .configured = {}}),
                       0);
         });
-    for (std::thread& each : threads)
-        each.join();
+    test::together(removals);
     EXPECT_TRUE(host::readUsersFile(file).empty());
 }
 

@@ -10,7 +10,6 @@
 namespace {
 
 using On = test::AllocationFailure::On;
-using test::CallResult;
 
 constexpr unsigned kJobStarted = 4096;
 constexpr unsigned kInsufficientMemory = 4100;
@@ -19,7 +18,7 @@ class AllocationTest : public test::UpdateTest {
   protected:
     /// One update, with the n-th allocation failing. False when it was never reached.
     bool failAt(On on, std::uint64_t n, bool releases) {
-        CallResult result;
+        test::CallResult result;
         bool struck = false;
         {
             const test::AllocationFailure failure(on, n);

@@ -10,7 +10,6 @@
 namespace {
 
 namespace fs = std::filesystem;
-using test::CallResult;
 using utils::FirmwareType;
 
 /// What CutFiles throws where the power fails.
@@ -134,7 +133,7 @@ class UpdatePowerLossTest : public test::UpdateTest {
 
         const auto files = std::make_shared<CutFiles>(k, root);
         powerOn(root, files);
-        const CallResult update = install(m_image, "eth0");
+        const test::CallResult update = install(m_image, "eth0");
         EXPECT_EQ(update.returnValue, 4096U) << update.error;
         if (!update.job) return false;
         const core::InstanceValue job = waitForEnd(*update.job);

@@ -19,7 +19,6 @@ using test::contains;
 using test::ProgramResult;
 using test::RunningDaemon;
 using ::testing::AllOf;
-using ::testing::Contains;
 using ::testing::ElementsAre;
 using ::testing::HasSubstr;
 
@@ -85,8 +84,9 @@ TEST(DaemonTest, CarriesAnUpdateFromItsStartToItsDeletion) {
         EXPECT_EQ(daemon.lines(operation, job).size(), 3U) << operation;
     EXPECT_EQ(daemon.lines("-ac CIM_OwningJobElement -ar OwnedElement ain", job).size(), 1U);
     EXPECT_TRUE(reaches(daemon, job, "7"));
-    EXPECT_THAT(daemon.lines("ei", "Quenx_SoftwareIdentity"),
-                Contains(AllOf(HasSubstr("eth0:IMG_PXE"), HasSubstr("VersionString=\"IMG_PXE 2\""))));
+    EXPECT_THAT(
+        daemon.lines("ei", "Quenx_SoftwareIdentity"),
+        ::testing::Contains(AllOf(HasSubstr("eth0:IMG_PXE"), HasSubstr("VersionString=\"IMG_PXE 2\""))));
     EXPECT_EQ(daemon.wbemcli("di", job).status, 0);
     EXPECT_TRUE(contains(daemon.wbemcli("gi", job).error, "(6) CIM_ERR_NOT_FOUND"));
     EXPECT_TRUE(contains(daemon.wbemcli("di", job).error, "(6) CIM_ERR_NOT_FOUND"));

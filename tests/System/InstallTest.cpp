@@ -13,10 +13,8 @@ using test::contains;
 using test::HeldFlash;
 using test::Program;
 using test::ProgramResult;
-using ::testing::AllOf;
 using ::testing::EndsWith;
 using ::testing::HasSubstr;
-using ::testing::StartsWith;
 
 constexpr const char* kOld = "IMG_PXE 1, IMG_UEFI 0";
 constexpr const char* kNew = "IMG_PXE 2, IMG_UEFI 2";
@@ -33,10 +31,11 @@ TEST_F(InstallTest, WritesTheImageAndSaysWhatChanged) {
     EXPECT_EQ(result.status, 0) << result.error;
     EXPECT_THAT(result.out, EndsWith("eth0 was updated.\n  IMG_PXE   1 -> 2\n  IMG_UEFI  0 -> 2\n"));
     EXPECT_EQ(result.error, "");
-    EXPECT_THAT(quenxctl("adapters").out,
-                StartsWith("NAME  PCI      IDS        UPDATABLE  FIRMWARE                 DESCRIPTION\n"
-                           "eth0  03:00.0  1af4:1041  yes        IMG_PXE 2, IMG_UEFI 2    \n"
-                           "eth1  03:00.1  1af4:1041  yes        IMG_PXE 1, IMG_UEFI 0    \n"));
+    EXPECT_THAT(
+        quenxctl("adapters").out,
+        ::testing::StartsWith("NAME  PCI      IDS        UPDATABLE  FIRMWARE                 DESCRIPTION\n"
+                              "eth0  03:00.0  1af4:1041  yes        IMG_PXE 2, IMG_UEFI 2    \n"
+                              "eth1  03:00.1  1af4:1041  yes        IMG_PXE 1, IMG_UEFI 0    \n"));
     for (const std::string address : {"03:00.0", "0000:03:00.0"}) {
         const ProgramResult again = quenxctl("install --target " + address + " IMAGE");
         EXPECT_EQ(again.status, 3);
@@ -52,11 +51,11 @@ TEST_F(InstallTest, LeavesAnAuditLine) {
     const std::tuple<std::string, std::string, std::string> table[] = {
         {"check", "CheckImage", "0"}, {"install", "InstallFromURI", "4096, Job="}};
     for (const auto& [verb, operation, returned] : table)
-        EXPECT_THAT(
-            quenxctl(verb + " --target eth0 IMAGE --force", {"QUENX_LOG=stderr"}).error,
-            AllOf(HasSubstr("[audit] user=\""), HasSubstr("\" address=\"local\" operation=\"" + operation),
-                  HasSubstr("arguments=\"URI='file://" + m_image + "'"),
-                  HasSubstr("outcome=\"returned " + returned)));
+        EXPECT_THAT(quenxctl(verb + " --target eth0 IMAGE --force", {"QUENX_LOG=stderr"}).error,
+                    ::testing::AllOf(HasSubstr("[audit] user=\""),
+                                     HasSubstr("\" address=\"local\" operation=\"" + operation),
+                                     HasSubstr("arguments=\"URI='file://" + m_image + "'"),
+                                     HasSubstr("outcome=\"returned " + returned)));
 }
 
 TEST_F(InstallTest, ShowsABarOnATerminalOnly) {

@@ -8,10 +8,8 @@
 
 namespace {
 
-using test::contains;
 using ::testing::AllOf;
 using ::testing::HasSubstr;
-using ::testing::Not;
 
 /// Images in a directory that the inventory looks into.
 class InventoryTest : public test::Quenxctl {
@@ -28,7 +26,7 @@ class InventoryTest : public test::Quenxctl {
     std::string idOf(const std::string& part) const {
         const auto document = nlohmann::json::parse(quenxctl("identities --json").out);
         for (const auto& one : document["identities"]) {
-            if (contains(one["id"], part)) return one["id"];
+            if (test::contains(one["id"], part)) return one["id"];
         }
         return "no id with " + part;
     }
@@ -51,7 +49,7 @@ TEST_F(InventoryTest, ChangesNothingByACheckAndInstallsByIdentity) {
     EXPECT_THAT(quenxctl("identities").out,
                 AllOf(HasSubstr("IMG_PXE 2, IMG_UEFI 2  IMG_PXE,IMG_UEFI  file://"),
                       HasSubstr("/firmware/new.rom"), HasSubstr("/firmware/other.rom"),
-                      HasSubstr("Firmware of adapter eth0"), Not(HasSubstr("broken.rom"))));
+                      HasSubstr("Firmware of adapter eth0"), ::testing::Not(HasSubstr("broken.rom"))));
 
     const std::string identity = " --target eth0 --identity " + idOf("1af4-1041");
     // A file need not be in the inventory.

@@ -14,9 +14,10 @@
 
 namespace test {
 
-/// The words of a command line: what stands between its spaces. The word IMAGE becomes the image's path.
-inline std::vector<std::string> wordsOf(const std::string& line, const std::string& image = "") {
-    std::vector<std::string> words;
+/// The command with the words of a line: what stands between its spaces. The word IMAGE becomes the image's
+/// path.
+inline std::vector<std::string> withWordsOf(const std::string& line, const std::string& image,
+                                            std::vector<std::string> words) {
     std::istringstream stream(line);
     for (std::string word; std::getline(stream, word, ' ');)
         words.push_back(word == "IMAGE" ? image : word);
@@ -34,11 +35,10 @@ class Quenxctl : public ::testing::Test {
   protected:
     /// The program, the options that make its environment, and the words of the line.
     virtual std::vector<std::string> command(const std::string& line) const {
-        std::vector<std::string> words = wordsOf(line, m_image);
+        std::vector<std::string> words{QUENXCTL, "--adapters", m_adapters};
         // Never the machine's own.
-        if (!contains(line, "--config")) words.insert(words.begin(), {"--config", m_configuration});
-        words.insert(words.begin(), {QUENXCTL, "--adapters", m_adapters});
-        return words;
+        if (!contains(line, "--config")) words.insert(words.end(), {"--config", m_configuration});
+        return withWordsOf(line, m_image, words);
     }
     ProgramResult quenxctl(const std::string& line, const std::vector<std::string>& environment = {}) const {
         return run(command(line), environment);

@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 // quenxctl --server: the same verbs over CIM-XML, against a real quenx-cimd.
 #include <gtest/gtest.h>
+#include <sys/stat.h>
+#include <unistd.h>
 
 #include <cstdlib>
 #include <fstream>
@@ -10,6 +12,7 @@
 
 #include "System/HeldFlash.h"
 #include "System/Quenxctl.h"
+#include "System/RawConnection.h"
 #include "System/RunningDaemon.h"
 
 namespace {
@@ -29,9 +32,7 @@ class RemoteTest : public test::Quenxctl {
     }
     std::vector<std::string> trustingNobody(const std::string& line) const {
         const std::string url = "https://127.0.0.1:" + std::to_string(m_daemon.httpsPort());
-        std::vector<std::string> words = test::wordsOf(line, m_daemon.image());
-        words.insert(words.begin(), {QUENXCTL, "--server", url, "--user", "admin"});
-        return words;
+        return test::withWordsOf(line, m_daemon.image(), {QUENXCTL, "--server", url, "--user", "admin"});
     }
 
     test::RunningDaemon m_daemon;
@@ -117,10 +118,10 @@ std::multiset<std::string> linesOf(const std::string& text) {
 
 TEST_F(RemoteTest, ShowsTheSameModelAsInProcess) {
     const auto inProcess = [&](const std::string& line) {
-        std::vector<std::string> words = test::wordsOf(line);
-        words.insert(words.begin(), {QUENXCTL, "--adapters", m_daemon.folder() / "adapters.toml", "--config",
-                                     m_daemon.folder() / "provider.conf"});
-        return test::run(words).out;
+        return test::run(test::withWordsOf(line, "",
+                                           {QUENXCTL, "--adapters", m_daemon.folder() / "adapters.toml",
+                                            "--config", m_daemon.folder() / "provider.conf"}))
+            .out;
     };
     const std::string names = inProcess("instances Quenx_EthernetPort --names");
     const std::string port = " " + names.substr(0, names.find('\n'));
@@ -187,6 +188,54 @@ TEST_F(RemoteTest, AsksForThePasswordWithoutShowingIt) {
         EXPECT_TRUE(contains(silent.error, user.empty() ? "--user or the" : "variable QUENXCTL_PASSWORD"))
             << silent.error;
     }
+}
+
+/// By the Unix socket of the daemon, and with one connection for all of the network.
+class LocalServerTest : public test::Quenxctl {
+  protected:
+    LocalServerTest() { ::setenv("QUENXCTL_SOCKET", m_socket.c_str(), 1); }
+    std::vector<std::string> command(const std::string& line) const override {
+        return test::withWordsOf(line, m_daemon.image(), {QUENXCTL});
+    }
+
+    test::RunningDaemon m_daemon{{"--limits-connections", "1"}};
+    const std::string m_socket = m_daemon.folder() / "socket";
+};
+
+TEST_F(LocalServerTest, IsThereForRootWhenTheNetworkIsFull) {
+    test::HeldFlash held(m_daemon.folder() / "state/eth0");
+    const std::string url = "http://127.0.0.1:" + std::to_string(m_daemon.httpPort());
+    test::Program only(
+        {QUENXCTL, "--server", url, "--user", "admin", "install", "--target", "eth0", m_daemon.image()},
+        test::Program::Output::Pipes, {"QUENXCTL_PASSWORD=admin"});
+    ASSERT_TRUE(only.waitFor("eth0: 0 %"));
+    // The one connection of the network has logged in, and makes room for nobody.
+    const test::RawConnection refused(m_daemon.httpPort(), "127.0.0.1");
+    refused.send(test::httpRequest(""));
+    EXPECT_EQ(refused.receive(), "");
+    expectOutput("jobs", "Job#1");
+    expectError("install --server unix:" + m_socket + " --target eth1 IMAGE", 1, "eth0 is being updated");
+    held.release();
+    EXPECT_EQ(only.finish().status, 0);
+    expectOutput("delete 1", "Deleted");
+    expectOutput("jobs --server unix:", "There are no jobs.");
+    expectError("jobs --server unix: --user admin", 2, "--user, --cacert and --insecure cannot be used");
+    const std::string other = m_socket + "2";
+    expectError("jobs --server unix:" + other, 4, "There is no socket " + other);
+    EXPECT_TRUE(contains(quenxctl("jobs", {"QUENXCTL_SOCKET=" + other}).error, "with --server."));
+}
+
+TEST_F(LocalServerTest, KeepsOthersOutEvenIfFolderAndModeWereOpen) {
+    if (::geteuid() != 0) GTEST_SKIP() << "only root can become somebody else";
+    const auto expectForNobody = [&](const std::string& reason) {
+        const test::ProgramResult result = test::run(test::asNobody(command("jobs --server unix:")));
+        EXPECT_TRUE(contains(result.error, reason)) << result.error;
+    };
+    expectForNobody("Only root may use " + m_socket);
+    ::chmod(m_daemon.folder().path().c_str(), 0755);
+    expectForNobody("Only root may use " + m_socket);
+    ::chmod(m_socket.c_str(), 0666);
+    expectForNobody("This user may not use the server.");
 }
 
 }  // namespace
