@@ -30,8 +30,8 @@ struct card {
 	struct debugfs_blob_wrapper content;
 	atomic_t flashing;
 	struct dentry *folder;
-	u32 step_ms, fail_at, fail_errno, most_flashing, flashes;
-	bool quiet, fail_activation, lose_interface;
+	u32 fail_at, fail_errno, most_flashing, flashes;
+	bool hold, quiet, fail_activation, lose_interface;
 };
 
 struct function {
@@ -59,11 +59,10 @@ static struct card *make_card(const char *name)
 		strscpy(card->running[i], "1.0.0", VERSION_SIZE);
 		strscpy(card->stored[i], "1.0.0", VERSION_SIZE);
 	}
-	card->step_ms = 10;
 	card->fail_at = U32_MAX;
 	card->fail_errno = EIO;
 	card->folder = debugfs_create_dir(name, folder);
-	debugfs_create_u32("step_ms", 0600, card->folder, &card->step_ms);
+	debugfs_create_bool("hold", 0600, card->folder, &card->hold);
 	debugfs_create_u32("fail_at", 0600, card->folder, &card->fail_at);
 	debugfs_create_u32("fail_errno", 0600, card->folder, &card->fail_errno);
 	debugfs_create_bool("quiet", 0600, card->folder, &card->quiet);
@@ -127,7 +126,9 @@ static int write_flash(struct devlink *devlink, struct card *card, struct devlin
 		if (!card->quiet)
 			devlink_flash_update_status_notify(devlink, "Flashing", params->component,
 							   params->fw->size * step / STEPS, params->fw->size);
-		msleep(card->step_ms);
+		do
+			msleep(1);
+		while (READ_ONCE(card->hold) && step == STEPS / 2);
 	}
 	return 0;
 }
