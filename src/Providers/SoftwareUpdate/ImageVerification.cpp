@@ -90,8 +90,9 @@ class ImageFile {
   public:
     explicit ImageFile(const std::string& uri) : m_uri(uri) {}
 
-    /// Finds the local path that the URI names, and reads it: opened once, it cannot be exchanged meanwhile.
-    void locate() {
+    /// Finds the local path that the URI names and reads the whole file: opened once, it cannot be exchanged
+    /// meanwhile. One that is larger than allowed is opened, but not read.
+    void read() {
         const utils::Uri parsed(m_uri);
         if (!parsed.IsUriSupported())
             throw EInvalidUri(utils::formatStr("URI: %s is invalid", m_uri.c_str()));
@@ -132,12 +133,15 @@ class ImageFile {
                 m_path, m_limits.largest != 0 ? std::min(m_limits.largest, kLargest) : kLargest, patience);
             if (found) return std::move(*found);
         } catch (const std::bad_alloc&) {
-            // Whoever cannot ask for the file does not know of it.
+            // As Uri::IsUriAccesible() has it: a look that fails, for whatever reason, finds no file.
             return {};
         }
         if (patience.hungFiles != 0) {
             QUENX_ERROR("%s is not read: %u other files are on file systems that do not answer",
                         m_path.c_str(), patience.hungFiles);
+        } else if (patience.isUsedUp) {
+            QUENX_ERROR("%s is not read: its file system is too slow, with pauses of %d seconds in all",
+                        m_path.c_str(), static_cast<int>(patience.total.count() / 1000));
         } else {
             QUENX_ERROR("%s is not read: its file system did not answer for %d seconds, now or earlier",
                         m_path.c_str(), static_cast<int>(m_limits.silence.count()));
@@ -201,8 +205,8 @@ PreparedImage readAndPrepare(const UpdateOrder& order, bool& isAskingAdapter) {
     const auto& [adapterName, uri, options, values] = order;
     utils::formatDebugLog(__FILE__, kCheckAndVerifyImage, __LINE__, "Checking URI : '%s' ", uri.c_str());
     ImageFile file(uri);
-    file.locate();
-    // Measured once: buffers and preparation must agree on one size, whatever happens to the file.
+    file.read();
+    // The size that it had when it was opened: whatever happens to the file, buffers and preparation agree.
     const std::uint32_t fileSize = file.measure();
     const Buffer source = file.takeBytes();
     Buffer image = std::make_unique_for_overwrite<std::uint8_t[]>(fileSize);

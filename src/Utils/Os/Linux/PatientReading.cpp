@@ -25,7 +25,8 @@ using Clock = std::chrono::steady_clock;
 using std::chrono::milliseconds;
 
 constexpr std::size_t kStep = std::size_t{64} * 1024;
-constexpr milliseconds kFree(1000);  // a slow medium is not a silent one
+constexpr std::size_t kSmallStep = 4096;
+constexpr milliseconds kFree(1000);  // a step that takes no longer uses up no patience
 constexpr milliseconds kLook(100);   // between two looks at a reader that works
 constexpr unsigned int kMaxLeftBehind = 64;
 
@@ -38,7 +39,7 @@ struct Reading {
     int error = 0;  ///< errno of what failed
     std::atomic<std::uint64_t> steps = 0;
     bool isDone = false;
-    bool isLeftBehind = false;
+    std::atomic<bool> isLeftBehind = false;
     Reading* next = nullptr;  ///< in the list of those under way
 };
 
@@ -93,22 +94,20 @@ void readFrom(int file, Reading& reading) {
     const auto size = static_cast<std::size_t>(found.size);
     found.bytes.reset(new (std::nothrow) std::uint8_t[size]);
     found.isWithoutMemory = found.bytes == nullptr;
-    while (!found.isWithoutMemory && found.count < size) {
+    std::size_t step = kStep;
+    // A slow medium would give the rest of a file that nobody waits for any more.
+    while (!found.isWithoutMemory && found.count < size && !reading.isLeftBehind) {
+        const auto begun = Clock::now();
         reached(reading);
-        const ssize_t got =
-            ::read(file, found.bytes.get() + found.count, std::min(kStep, size - found.count));
+        const ssize_t got = ::read(file, found.bytes.get() + found.count, std::min(step, size - found.count));
         if (got < 0 && errno == EINTR) continue;
         if (got <= 0) return;
         found.count += static_cast<std::size_t>(got);
+        if (step == kSmallStep || Clock::now() - begun <= kFree) continue;
+        // Slow, or silent for a while? Small steps tell, as long as the system does not read ahead.
+        step = kSmallStep;
+        ::posix_fadvise(file, 0, 0, POSIX_FADV_RANDOM);
     }
-}
-
-int openForReading(const std::string& path) {
-    constexpr int kFlags = O_RDONLY | O_CLOEXEC | O_NOCTTY;
-    // A FIFO that took the file's place after the look at it must not block the opening.
-    const int file = ::open(path.c_str(), kFlags | O_NONBLOCK);
-    // Somebody has a lease on the file, which the kernel takes back while this waits.
-    return file < 0 && errno == EWOULDBLOCK ? ::open(path.c_str(), kFlags) : file;
 }
 
 void carryOut(Reading& reading) {
@@ -165,7 +164,11 @@ bool waitFor(std::unique_lock<std::mutex>& lock, Patience& patience, Condition i
             since = now;
         }
         if (isDone) return true;
-        if (silence >= std::min(patience.silence, std::max(patience.left, kFree))) return false;
+        const milliseconds left = std::max(patience.left, kFree);
+        if (silence >= std::min(patience.silence, left)) {
+            patience.isUsedUp = silence < patience.silence;
+            return false;
+        }
         Readings::all().changed.wait_until(lock, now + kLook);
     }
 }
@@ -180,8 +183,7 @@ bool carryOutPatiently(std::unique_ptr<Reading>& reading, Patience& patience) {
         lock, patience, [&] { return other() == nullptr || other()->isLeftBehind; },
         [&] { return other() == nullptr ? 0 : other()->steps.load(); });
     if (readings.leftBehind >= kMaxLeftBehind) patience.hungFiles = readings.leftBehind;
-    patience.isOver = !isFree || other() != nullptr || patience.hungFiles != 0;
-    if (patience.isOver) return false;
+    if (!isFree || other() != nullptr || patience.hungFiles != 0) return false;
     pthread_t thread{};
     if (const utils::SignalsBlocked blocked;
         ::pthread_create(&thread, nullptr, &readerThread, reading.get()) != 0) {
@@ -200,7 +202,6 @@ bool carryOutPatiently(std::unique_ptr<Reading>& reading, Patience& patience) {
         ::pthread_join(thread, nullptr);
         return true;
     }
-    patience.isOver = true;
     reading.release()->isLeftBehind = true;
     ++readings.leftBehind;
     ::pthread_detach(thread);
@@ -210,6 +211,16 @@ bool carryOutPatiently(std::unique_ptr<Reading>& reading, Patience& patience) {
 }  // namespace
 
 std::atomic<void (*)(const std::string& path)> beforeFileAccess = nullptr;
+
+int openForReading(const std::string& path) noexcept {
+    constexpr int kFlags = O_RDONLY | O_CLOEXEC | O_NOCTTY;
+    // A FIFO may take the file's place after any look at it.
+    const int file = ::open(path.c_str(), kFlags | O_NONBLOCK);
+    if (file >= 0 || errno != EWOULDBLOCK) return file;
+    // A lease: the kernel takes it back while this waits. Some devices are busy for ever.
+    struct stat status {};
+    return ::stat(path.c_str(), &status) == 0 && S_ISREG(status.st_mode) ? ::open(path.c_str(), kFlags) : -1;
+}
 
 std::optional<FileLook> lookAtFile(const std::string& path, std::int64_t most, Patience& patience) {
     auto reading = std::make_unique<Reading>();

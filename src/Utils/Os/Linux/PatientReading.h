@@ -20,12 +20,13 @@ namespace os {
 struct Patience {
     /// @param limit  the longest silence: until a file is open, until its next bytes come
     explicit Patience(std::chrono::milliseconds limit = std::chrono::seconds(30))
-        : silence(limit), left(limit + limit / 4) {}
+        : silence(limit), total(limit + limit / 4), left(total) {}
 
     const std::chrono::milliseconds silence;
-    std::chrono::milliseconds left;  ///< for all silences of more than a second together
-    bool isOver = false;             ///< a file was given up, in this request or an earlier one
-    unsigned int hungFiles = 0;      ///< if they were too many to begin another one
+    const std::chrono::milliseconds total;  ///< for all silences of more than a second together
+    std::chrono::milliseconds left;         ///< of `total`
+    bool isUsedUp = false;       ///< a file was given up because nothing was left, not for one long silence
+    unsigned int hungFiles = 0;  ///< if they were too many to begin another one
 };
 
 enum class FileKind { Regular, Directory, CannotBeOpened, CannotBeLookedAt };
@@ -40,13 +41,19 @@ struct FileLook {
 };
 
 /// Opens what the path names, once, and reads a regular file of at most `most` bytes whole. Only regular
-/// files and directories are opened: a FIFO never blocks, and a device is not touched. Nothing when the file
-/// was given up; then `patience` is over, and further calls for this path answer so at once until the one
-/// that hangs has come back. errno tells why a file cannot be opened.
+/// files and directories are opened: a FIFO never blocks, and a device is not touched. A medium that gives a
+/// page a second uses up no patience. Nothing when the file was given up; further calls for this path answer
+/// so at once until the one that hangs has come back. errno tells why a file cannot be opened.
 /// @param most  a larger file is not read; -1 reads none
 /// @throws std::bad_alloc  before the file is touched
 QUENX_EXPORT std::optional<FileLook> lookAtFile(const std::string& path, std::int64_t most,
                                                 Patience& patience);
+
+/// Opens a file for reading, close-on-exec. Never blocks on a FIFO. For a file that somebody has a lease on
+/// it waits until the kernel has taken that back, which takes 45 seconds at most unless the system says
+/// otherwise.
+/// @return -1 with errno set where that fails
+QUENX_EXPORT int openForReading(const std::string& path) noexcept;
 
 /// A test's own file system: called with the path before each system call for a file, and may block. Null
 /// unless a test sets it.

@@ -36,11 +36,6 @@ struct CloseDirectory {
 };
 using Directory = std::unique_ptr<DIR, CloseDirectory>;
 
-/// A FIFO that took the file's place after the look at it must not block the opening.
-int openForReading(const std::string& path) noexcept {
-    return open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK | O_NOCTTY);
-}
-
 /// Fills the buffer as far as the file goes; returns 0, or the errno value of what stopped it.
 int readUpTo(const Descriptor& file, std::span<std::uint8_t> buffer, std::size_t& count) noexcept {
     for (count = 0; count < buffer.size();) {

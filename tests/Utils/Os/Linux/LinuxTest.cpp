@@ -7,7 +7,10 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include <chrono>
+#include <csignal>
 #include <system_error>
+#include <thread>
 
 #include "Support/SyslogCapture.h"
 #include "Support/TempFolder.h"
@@ -52,6 +55,19 @@ TEST(LinuxTest, KeepsTheNumbersOfClosedStandardStreams) {
                                                                                                        : 1);
         },
         testing::ExitedWithCode(0), "");
+}
+
+TEST(LinuxTest, WaitsForALease) {
+    const test::TempFolder folder;
+    const std::string file = folder.write("leased", "12345");
+    const os::Descriptor holder(open(file.c_str(), O_RDWR));
+    signal(SIGIO, SIG_IGN);  // as the holder is told
+    if (fcntl(holder.number(), F_SETLEASE, F_WRLCK) != 0) GTEST_SKIP() << "a file system without leases";
+    const std::jthread gives([&] {
+        std::this_thread::sleep_for(std::chrono::milliseconds(20));
+        fcntl(holder.number(), F_SETLEASE, F_UNLCK);
+    });
+    EXPECT_EQ(os::readWholeFile(file, 10).value().size(), 5U);
 }
 
 TEST(LinuxTest, ReadsWholeFilesUpToALimit) {
