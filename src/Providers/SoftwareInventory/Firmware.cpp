@@ -40,19 +40,23 @@ std::int64_t nanoseconds(const timespec& time) {
 }
 
 /// The bytes of a file that begins as a ROM does; otherwise nothing, and the reason.
-std::vector<std::uint8_t> readRom(const std::string& path, std::int64_t size, std::string& problem) {
+/// @param isUnread  set when the file may have more than could be read
+std::vector<std::uint8_t> readRom(const std::string& path, std::int64_t size, std::string& problem,
+                                  bool& isUnread) {
     // Two bytes tell most other files apart, however large those are.
     std::vector<std::uint8_t> bytes(2);
     if (size > kMaxFileSize) {
         problem = "it is too large for an option ROM";
     } else if (os::readFile(path, bytes) != bytes.size()) {
         problem = "it is empty or cannot be read";
+        isUnread = size >= 2;
     } else if (ma::readLe16(bytes, 0) != ma::rom::kSignature) {
         problem = "it is not an option ROM";
     } else {
         bytes.resize(static_cast<std::size_t>(size));
         if (os::readFile(path, bytes) == bytes.size()) return bytes;
         problem = "it cannot be read to its end";
+        isUnread = true;
     }
     return {};
 }
@@ -98,17 +102,23 @@ bool FirmwareCatalog::takeStamp(const std::string& path, Stamp& stamp) {
     return true;
 }
 
-std::shared_ptr<const FirmwareFile> FirmwareCatalog::read(const std::string& path, std::int64_t size) {
+FirmwareCatalog::Entry FirmwareCatalog::read(const std::string& path, const Stamp& stamp,
+                                             const Entry* before) {
     QUENX_DEBUG("Reading firmware file '%s'", path.c_str());
+    Entry entry{stamp};
     std::string problem;
-    const std::vector<std::uint8_t> bytes = readRom(path, size, problem);
+    const std::vector<std::uint8_t> bytes = readRom(path, stamp.size, problem, entry.isUnread);
     if (problem.empty()) {
         const ma::RomFile rom = ma::parseOptionRom(bytes);
-        if (!rom.error) return std::make_shared<FirmwareFile>(FirmwareFile{path, describeImage(bytes, rom)});
+        if (!rom.error) {
+            entry.file = std::make_shared<FirmwareFile>(FirmwareFile{path, describeImage(bytes, rom)});
+            return entry;
+        }
         problem = *rom.error;
     }
-    QUENX_ERROR("Firmware file '%s' is skipped: %s", path.c_str(), problem.c_str());
-    return nullptr;
+    const bool isKnown = before != nullptr && before->isUnread && entry.isUnread && before->stamp == stamp;
+    if (!isKnown) QUENX_ERROR("Firmware file '%s' is skipped: %s", path.c_str(), problem.c_str());
+    return entry;
 }
 
 FirmwareCatalog::Files FirmwareCatalog::scan() {
@@ -124,9 +134,10 @@ FirmwareCatalog::Files FirmwareCatalog::scan() {
             Stamp stamp;
             // A directory that the configuration lists twice is served once.
             if (entries.contains(path) || !takeStamp(path, stamp)) continue;
-            const auto old = m_known.find(path);
-            const bool isKnown = old != m_known.end() && old->second.stamp == stamp;
-            const Entry& entry = entries[path] = {stamp, isKnown ? old->second.file : read(path, stamp.size)};
+            const auto known = m_known.find(path);
+            const Entry* before = known == m_known.end() ? nullptr : &known->second;
+            const bool isCurrent = before != nullptr && !before->isOutdated(stamp);
+            const Entry& entry = entries[path] = isCurrent ? *before : read(path, stamp, before);
             if (entry.file != nullptr) files.push_back(entry.file);
         }
     }

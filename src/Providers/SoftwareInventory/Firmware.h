@@ -53,8 +53,8 @@ struct FirmwareFile {
 };
 
 /// The option-ROM files in the configured firmware directories. A file is read once and again only when it
-/// has changed; one that is broken or cannot be read is left out, with one log line when that is found out.
-/// Thread-safe.
+/// has changed; one that is broken is left out, with one log line when that is found out. So is one that
+/// cannot be read, which is tried again at each look. Thread-safe.
 class FirmwareCatalog {
   public:
     using Files = std::vector<std::shared_ptr<const FirmwareFile>>;
@@ -76,13 +76,18 @@ class FirmwareCatalog {
     };
     struct Entry {
         Stamp stamp;
-        std::shared_ptr<const FirmwareFile> file;  ///< null for one that is left out
+        std::shared_ptr<const FirmwareFile> file = nullptr;  ///< null for one that is left out
+        bool isUnread = false;                               ///< what is in it is not known yet
+
+        /// Whether the file has to be read for this stamp.
+        bool isOutdated(const Stamp& now) const { return isUnread || stamp != now; }
     };
     using Entries = std::map<std::string, Entry>;
 
     /// Takes the file's stamp. False for a directory, a device and the like.
     static bool takeStamp(const std::string& path, Stamp& stamp);
-    static std::shared_ptr<const FirmwareFile> read(const std::string& path, std::int64_t size);
+    /// @param before  what was known of the file; null when it is new
+    static Entry read(const std::string& path, const Stamp& stamp, const Entry* before);
 
     utils::Mutex m_mutex;
     Entries m_known QUENX_GUARDED_BY(m_mutex);
