@@ -208,9 +208,10 @@ TEST_F(InstallVerbTest, SaysAfterAFailureOnlyWhatWasReadBack) {
     const std::string reason = "cannot make the folder /x: Permission denied";
     const std::tuple<Instances, bool, std::string, std::string> table[] = {
         {kOld, true, reason,
-         reason +
-             " (error 0).\nIt keeps its old firmware. Run quenxctl as root, or name a folder of your own "
-             "with --adapters FILE --state DIR.\n"},
+         reason + " (error 0).\nIt keeps its old firmware. " +
+             (::geteuid() == 0 ? "Name a folder that can be written"
+                               : "Run quenxctl as root, or name a folder of your own") +
+             " with --adapters FILE --state DIR.\n"},
         {{component("IMG_PXE", 2), kOld[1]},
          true,
          "gone",

@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Cli/Update/Service.h"
 
+#include <unistd.h>
+
 #include <cerrno>
 #include <system_error>
 
@@ -235,8 +237,11 @@ std::string readBackText(const Candidate& candidate, const std::vector<Component
 std::string permissionAdvice(const std::string& reason) {
     // The job only carries the text that the adapter API made of the error.
     for (const int error : {EACCES, EPERM, EROFS}) {
-        if (reason.find(std::generic_category().message(error)) != std::string::npos)
-            return "Run quenxctl as root, or name a folder of your own with --adapters FILE --state DIR.";
+        if (reason.find(std::generic_category().message(error)) == std::string::npos) continue;
+        const bool mayRootHelp = ::geteuid() != 0 && error != EROFS;
+        return (mayRootHelp ? "Run quenxctl as root, or name a folder of your own"
+                            : "Name a folder that can be written") +
+               std::string(" with --adapters FILE --state DIR.");
     }
     return {};
 }

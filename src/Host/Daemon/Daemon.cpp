@@ -15,6 +15,7 @@
 #include "Host/Server/ServerCertificate.h"
 #include "MidAPI/ma.h"
 #include "Providers/Schema/ValueMaps.h"
+#include "Utils/Os/Linux/OwnFiles.h"
 #include "Utils/Os/Linux/linux.h"
 
 namespace host {
@@ -60,6 +61,8 @@ LockFile::LockFile(const std::string& path) try : m_path(path), m_lock(withItsFo
                              (error.code().value() == EACCES
                                   ? "Run as root, or set daemon.lock_file."
                                   : "Set daemon.lock_file to a file that can be written."));
+} catch (const os::ForeignFile& error) {
+    throw std::runtime_error(std::string(error.what()) + ". Or set daemon.lock_file to another file.");
 }
 
 void LockFile::require() const {

@@ -16,6 +16,7 @@ namespace ma {
 namespace {
 
 constexpr mode_t kFolderMode = 0755;
+constexpr const char* kCannotWrite = "cannot write the file";
 
 [[noreturn]] void fail(const std::string& what) {
     throw std::system_error(errno, std::generic_category(), what);
@@ -32,12 +33,12 @@ void FlashFiles::makeFolder(const std::string& path) {
 int FlashFiles::create(const std::string& path) {
     // A link in the state directory, or somebody else's file, must not lead the daemon, which is root, to
     // another file.
-    const int file = os::openOwnFile(path, O_WRONLY);
-    if (file >= 0 && ::ftruncate(file, 0) == 0) return file;
+    const int file = os::openOwnFile(path, O_WRONLY, kCannotWrite);
+    if (::ftruncate(file, 0) == 0) return file;
     const int error = errno;
-    if (file >= 0) ::close(file);
+    ::close(file);
     errno = error;
-    fail("cannot write the file " + path);
+    fail(kCannotWrite + (" " + path));
 }
 
 void FlashFiles::write(int descriptor, std::span<const std::uint8_t> bytes) {

@@ -11,8 +11,8 @@
 namespace ma {
 
 /// Every change that the simulator makes to files, one system call each: the seam at which a test cuts the
-/// power. All operations throw std::system_error, which names the file and the reason. No state; may be used
-/// from any thread.
+/// power. All operations throw std::system_error with the reason, which names the file where the operation
+/// has its path. No state; may be used from any thread.
 class QUENX_EXPORT FlashFiles {
   public:
     FlashFiles() = default;
@@ -22,7 +22,8 @@ class QUENX_EXPORT FlashFiles {
 
     /// Makes one folder; it may be there already.
     virtual void makeFolder(const std::string& path);
-    /// Opens an empty file for writing, emptying one that is there; the caller closes the descriptor.
+    /// Opens an empty file for writing, emptying one that is there; the caller closes the descriptor. Throws
+    /// os::ForeignFile as well.
     virtual int create(const std::string& path);
     /// Writes all bytes at the end of what was written so far.
     virtual void write(int descriptor, std::span<const std::uint8_t> bytes);

@@ -23,8 +23,9 @@ namespace ma {
 /// goes, the adapter boots the old image or the new one, and either is complete. A damaged record is made up
 /// for by its copy or the banks, and the log says so. Reading never waits for a writer. The folder is made at
 /// the first write, for its owner alone; until then the adapter is as it left the factory. May be used from
-/// any thread and by several processes at once. Operations throw std::runtime_error: std::system_error for a
-/// file, OperationFailure when another process does not let go of the record, others for damage.
+/// any thread and by several processes at once. Operations throw std::runtime_error: std::system_error or
+/// os::ForeignFile for a file, OperationFailure when another process does not let go of the record, others
+/// for damage.
 class FlashStore {
   public:
     /// @param factoryFlash  the content of a flash that was never written to

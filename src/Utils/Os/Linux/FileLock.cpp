@@ -11,6 +11,7 @@
 #include <sstream>
 #include <system_error>
 
+#include "Utils/Os/Linux/OwnFiles.h"
 #include "Utils/Os/Linux/Thread.h"
 #include "Utils/Utils.h"
 
@@ -18,19 +19,12 @@ namespace os {
 
 namespace {
 
-constexpr mode_t kOwnerOnly = S_IRUSR | S_IWUSR;
 constexpr unsigned int kPoll = 5;  // ms
 
-[[noreturn]] void fail(const std::string& path, int error) {
-    throw std::system_error(error, std::generic_category(), "cannot lock " + path);
-}
+constexpr const char* kPurpose = "cannot lock";
 
-/// Nobody else may open, and so lock, the file.
-void closeToOthers(int file, const std::string& path) {
-    struct stat status {};
-    if (::fstat(file, &status) != 0) fail(path, errno);
-    const bool isOpenToOthers = (status.st_mode & (S_IRWXG | S_IRWXO)) != 0;
-    if (isOpenToOthers && ::fchmod(file, kOwnerOnly) != 0) fail(path, errno);
+[[noreturn]] void fail(const std::string& path, int error) {
+    throw std::system_error(error, std::generic_category(), std::string(kPurpose) + " " + path);
 }
 
 /// flock has no time-out, so it is asked again and again. Returns 0, or the errno value.
@@ -68,9 +62,9 @@ std::string programOf(pid_t process) {
 
 FileLock::FileLock(const std::string& path, std::chrono::milliseconds patience)
     // Writing the holder's number must not change a file that only bears this name, too.
-    : m_file(openOwnFile(path, O_RDWR)) {
-    if (m_file.number() < 0) fail(path, errno);
-    closeToOthers(m_file.number(), path);
+    : m_file(openOwnFile(path, O_RDWR, kPurpose)) {
+    // Nobody else may open, and so lock, the file.
+    if (!closeToOthers(m_file.number())) fail(path, errno);
     const int error = lockWithin(m_file.number(), patience);
     m_held = error == 0;
     if (!m_held && error != EWOULDBLOCK) fail(path, error);
@@ -78,7 +72,7 @@ FileLock::FileLock(const std::string& path, std::chrono::milliseconds patience)
 }
 
 FileLock::~FileLock() {
-    if (!m_held || m_process != ::getpid()) return;
+    if (!isHeld()) return;
     // Emptied before it is free again, so that nobody reads the id of a process that is done.
     if (::ftruncate(m_file.number(), 0) != 0) errno = 0;
     // Closing frees it only when no child that was forked meanwhile has the file open.
@@ -97,8 +91,8 @@ pid_t FileLock::holdingProcess() const {
     constexpr std::size_t kMaxLocks = std::size_t{1} << 20;
     struct stat status {};
     if (::fstat(m_file.number(), &status) != 0) return 0;
-    // The kernel knows better than the file, which a holder of another kind leaves as it was. Some file
-    // systems have a device number of their own in its list: the inode then has to do.
+    // The kernel is asked, not the file: in that a holder of another kind leaves no number. Some file systems
+    // have a device number of their own in the kernel's list: the inode then has to do.
     pid_t sameInode = 0;
     std::istringstream locks(readText("/proc/locks", kMaxLocks));
     for (std::string line; std::getline(locks, line);) {

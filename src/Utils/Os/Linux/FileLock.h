@@ -21,12 +21,14 @@ class QUENX_EXPORT FileLock {
     ///                  else still holds then is not an error, see isHeld().
     /// @throws std::system_error "cannot lock PATH: REASON", also for a symbolic link, for what is no regular
     ///         file, and for one that has further names
+    /// @throws ForeignFile "cannot lock PATH: it belongs to user N; ..."
     explicit FileLock(const std::string& path, std::chrono::milliseconds patience = {});
     FileLock(const FileLock&) = delete;
     FileLock& operator=(const FileLock&) = delete;
     ~FileLock();
 
-    bool isHeld() const { return m_held; }
+    /// False in a child that was forked since.
+    bool isHeld() const { return m_held && m_process == ::getpid(); }
 
     /// Who holds the lock that this one did not get, for a person: "process 812 (quenxctl)", "this process
     /// (812)" or, where the system does not tell, "another process".
@@ -38,7 +40,7 @@ class QUENX_EXPORT FileLock {
 
     const Descriptor m_file;
     bool m_held = false;
-    const pid_t m_process = ::getpid();  ///< a child that was forked meanwhile holds nothing
+    const pid_t m_process = ::getpid();
 };
 
 }  // namespace os

@@ -18,20 +18,61 @@ namespace {
     throw std::system_error(error, std::generic_category(), what);
 }
 
+/// 0, or the errno value of what lets others share the file.
+int whyNotAlone(const struct stat& status) noexcept {
+    if (!S_ISREG(status.st_mode)) return EINVAL;
+    return status.st_nlink > 1 ? EMLINK : 0;
+}
+
+/// The descriptor or, in its place, a copy with a number above 2.
+int aboveStandard(int descriptor) noexcept {
+    if (descriptor < 0 || descriptor > STDERR_FILENO) return descriptor;
+    const int copy = fcntl(descriptor, F_DUPFD_CLOEXEC, STDERR_FILENO + 1);
+    const int error = errno;
+    close(descriptor);
+    errno = error;
+    return copy;
+}
+
 }  // namespace
 
+ForeignFile::ForeignFile(const std::string& path, uid_t owner, const std::string& purpose)
+    : std::runtime_error(purpose + " " + path + ": it belongs to user " + std::to_string(owner) +
+                         ", who could exchange it; remove it, or run: chown " + std::to_string(geteuid()) +
+                         " " + path) {}
+
+int openOwnFile(const std::string& path, int access, const std::string& purpose) {
+    constexpr int kFlags = O_CREAT | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY;
+    const uid_t user = geteuid();
+    const int file = aboveStandard(open(path.c_str(), access | kFlags, S_IRUSR | S_IWUSR));
+    int error = file < 0 ? errno : 0;
+    struct stat status {};
+    status.st_uid = user;
+    // Rights refuse root nothing: in a folder like /tmp it is another user's file that the system keeps
+    // closed.
+    if (error == EACCES && user == 0) static_cast<void>(lstat(path.c_str(), &status));
+    if (error == 0) error = fstat(file, &status) != 0 ? errno : whyNotAlone(status);
+    if (error == 0 && status.st_uid == user) return file;
+    if (file >= 0) close(file);
+    if (status.st_uid != user) throw ForeignFile(path, status.st_uid, purpose);
+    fail(error, purpose + " " + path);
+}
+
+bool closeToOthers(int descriptor) noexcept {
+    struct stat status {};
+    if (fstat(descriptor, &status) != 0) return false;
+    if ((status.st_mode & (S_IRWXG | S_IRWXO)) == 0) return true;
+    return fchmod(descriptor, S_ISDIR(status.st_mode) ? S_IRWXU : S_IRUSR | S_IWUSR) == 0;
+}
+
 bool closeFolderToOthers(const std::string& path) {
+    const std::string purpose = "cannot use the folder";
     const Descriptor folder(::open(path.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC | O_NOFOLLOW));
     if (folder.number() < 0 && errno == ENOENT) return false;
     struct stat status {};
-    if (folder.number() < 0 || ::fstat(folder.number(), &status) != 0)
-        fail(errno, "cannot use the folder " + path);
-    if (status.st_uid != ::geteuid()) {
-        fail(EACCES, "the folder " + path + " belongs to user " + std::to_string(status.st_uid) +
-                         ", who could exchange the flash; choose another one, or make it yours");
-    }
-    const bool isOpen = (status.st_mode & (S_IRWXG | S_IRWXO)) != 0;
-    if (isOpen && ::fchmod(folder.number(), S_IRWXU) != 0) fail(errno, "cannot protect the folder " + path);
+    if (folder.number() < 0 || ::fstat(folder.number(), &status) != 0) fail(errno, purpose + " " + path);
+    if (status.st_uid != ::geteuid()) throw ForeignFile(path, status.st_uid, purpose);
+    if (!closeToOthers(folder.number())) fail(errno, "cannot protect the folder " + path);
     return true;
 }
 

@@ -1,18 +1,40 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include <sys/types.h>
+
 #include <cstdint>
 #include <span>
+#include <stdexcept>
 #include <string>
 
 #include "Utils/Export.h"
 
-/// Files and folders that are this user's alone and must survive a power cut. All operations throw
+/// Files and folders that are this user's alone and must survive a power cut. Operations throw
 /// std::system_error, which names the file and the reason; any thread may call.
 namespace os {
 
+/// Another user's file or folder in the place of one of this user's. what() says what to do, too.
+class QUENX_EXPORT ForeignFile : public std::runtime_error {
+  public:
+    /// @param purpose  the beginning of the text: "cannot lock"
+    ForeignFile(const std::string& path, uid_t owner, const std::string& purpose);
+};
+
+/// Opens a file that is this user's alone, and makes it if need be: a regular one, with one name, no link,
+/// and a number above 2, since what others write to streams that their process has closed must not reach it.
+/// @param access  O_WRONLY or O_RDWR
+/// @param purpose  the beginning of the error's text: "cannot lock"
+/// @return a descriptor that the caller closes
+/// @throws ForeignFile "PURPOSE PATH: it belongs to user N, ..." as well
+QUENX_EXPORT int openOwnFile(const std::string& path, int access, const std::string& purpose);
+
+/// Leaves the rights to an open file or folder to its owner alone. False with errno set where that fails.
+QUENX_EXPORT bool closeToOthers(int descriptor) noexcept;
+
 /// Closes a folder of this user's to all others: whoever can open a file can also lock it, and so hold up
-/// whoever else wants to. A folder that is another user's, and a link, is refused. False when there is none.
+/// whoever else wants to. A folder that is another user's (ForeignFile), and a link, is refused. False when
+/// there is none.
 QUENX_EXPORT bool closeFolderToOthers(const std::string& path);
 
 /// Writes all bytes at the file's position.

@@ -48,22 +48,6 @@ int readUpTo(const Descriptor& file, std::span<std::uint8_t> buffer, std::size_t
     return 0;
 }
 
-int giveUp(int descriptor, int error) noexcept {
-    if (descriptor >= 0) close(descriptor);
-    errno = error;
-    return -1;
-}
-
-/// The descriptor or, in its place, a copy with a number above 2.
-int aboveStandard(int descriptor) noexcept {
-    if (descriptor < 0 || descriptor > STDERR_FILENO) return descriptor;
-    const int copy = fcntl(descriptor, F_DUPFD_CLOEXEC, STDERR_FILENO + 1);
-    const int error = errno;
-    close(descriptor);
-    errno = error;
-    return copy;
-}
-
 [[noreturn]] void failToOpen(const std::string& path) {
     throw utils::Exception(utils::formatStr("Could not open the file %s", path.c_str()));
 }
@@ -151,16 +135,6 @@ std::optional<std::vector<std::uint8_t>> readWholeFile(const std::string& path, 
 void ignoreOtherSignals() noexcept {
     for (const int each : {SIGPIPE, SIGXFSZ, SIGUSR1, SIGUSR2, SIGALRM, SIGVTALRM, SIGPROF, SIGIO, SIGPWR})
         static_cast<void>(signal(each, SIG_IGN));
-}
-
-int openOwnFile(const std::string& path, int access) noexcept {
-    constexpr int kFlags = O_CREAT | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY;
-    const int file = aboveStandard(open(path.c_str(), access | kFlags, S_IRUSR | S_IWUSR));
-    struct stat status {};
-    if (file < 0 || fstat(file, &status) != 0) return giveUp(file, errno);
-    if (!S_ISREG(status.st_mode)) return giveUp(file, EINVAL);
-    if (status.st_nlink > 1) return giveUp(file, EMLINK);
-    return status.st_uid == geteuid() ? file : giveUp(file, EACCES);
 }
 
 bool isThisADir(const std::string& path) noexcept {

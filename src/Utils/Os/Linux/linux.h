@@ -61,12 +61,6 @@ QUENX_EXPORT std::optional<std::vector<std::uint8_t>> readWholeFile(const std::s
 /// a reader that goes away, a file that may not grow, timers and user signals. For the first lines of main().
 QUENX_EXPORT void ignoreOtherSignals() noexcept;
 
-/// Opens a file that is this user's alone, and makes it if need be: a regular one, with one name, no link,
-/// and a number above 2, since what others write to streams that their process has closed must not reach it.
-/// @param access  O_WRONLY or O_RDWR
-/// @return -1 with errno set where there is none; never throws
-QUENX_EXPORT int openOwnFile(const std::string& path, int access) noexcept;
-
 /// True exactly when the path can be opened as a directory.
 QUENX_EXPORT bool isThisADir(const std::string& path) noexcept;
 

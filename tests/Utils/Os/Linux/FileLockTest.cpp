@@ -2,7 +2,7 @@
 #include "Utils/Os/Linux/FileLock.h"
 
 #include <fcntl.h>
-#include <gtest/gtest.h>
+#include <gmock/gmock.h>
 #include <sys/file.h>
 #include <sys/stat.h>
 #include <sys/wait.h>
@@ -12,6 +12,7 @@
 #include <system_error>
 
 #include "Support/TempFolder.h"
+#include "Utils/Os/Linux/OwnFiles.h"
 
 namespace {
 
@@ -70,8 +71,14 @@ TEST(FileLockTest, TakesOnlyAFileThatIsItsUsersOwn) {
     ASSERT_EQ(::mkfifo((folder / "fifo").c_str(), 0600), 0);
     folder.write("foreign", "");
     const bool isRoot = ::chown((folder / "foreign").c_str(), 1, 1) == 0;
-    for (const char* name : {"link", "dangling", "second-name", "fifo", ".", isRoot ? "foreign" : "."})
+    for (const char* name : {"link", "dangling", "second-name", "fifo", "."})
         EXPECT_THROW(os::FileLock(folder / name), std::system_error) << name;
+    const std::string said =
+        "foreign: it belongs to user 1, who could exchange it; remove it, or run: chown 0 ";
+    if (isRoot) {
+        EXPECT_THAT([&] { os::FileLock(folder / "foreign"); },
+                    testing::ThrowsMessage<os::ForeignFile>(testing::HasSubstr(said)));
+    }
     EXPECT_EQ(test::readTestFile(precious).size(), 7U);
     EXPECT_FALSE(std::filesystem::exists(folder / "new"));
 }

@@ -15,6 +15,7 @@
 #include "Support/SyslogCapture.h"
 #include "Support/TempFolder.h"
 #include "Utils/Exception.h"
+#include "Utils/Os/Linux/OwnFiles.h"
 
 TEST(FileSizeTest, FailsForUnreadableFilesAndDescriptorZero) {
     const test::TempFolder folder;
@@ -49,7 +50,7 @@ TEST(LinuxTest, KeepsTheNumbersOfClosedStandardStreams) {
             os::openStandardDescriptors();
             const int next = dup(0);
             close(2);
-            const int above = os::openOwnFile(folder / "own", O_WRONLY);
+            const int above = os::openOwnFile(folder / "own", O_WRONLY, "cannot write");
             const bool isFree = fcntl(2, F_GETFD) < 0 && dup(0) == 2;
             _exit(isFree && above > next && next > 2 && write(1, "x", 1) == 1 && write(2, "x", 1) == 1 ? 0
                                                                                                        : 1);
