@@ -59,10 +59,9 @@ FoundState FlashStore::findState() const {
 }
 
 FoundState FlashStore::logOnce(FoundState found) const {
-    // Once, not at every query: the next change mends it.
+    // Each once, not at every query: the next change mends it.
     const utils::Mutex::AutoLocker lock(m_damageMutex);
-    if (found.damage != m_damage && !found.damage.empty()) QUENX_ERROR_TEXT(found.damage);
-    m_damage = found.damage;
+    if (!found.damage.empty() && m_logged.insert(found.damage).second) QUENX_ERROR_TEXT(found.damage);
     return found;
 }
 
@@ -195,6 +194,8 @@ void FlashStore::storeState(const FlashState& state) {
     storeRecord(state, m_folder.copy());
     storeRecord(state, m_folder.record());
     m_files->syncFolder(m_folder.path());
+    const utils::Mutex::AutoLocker lock(m_damageMutex);
+    m_logged.clear();
 }
 
 void FlashStore::storeRecord(const FlashState& state, const std::string& path) {

@@ -6,6 +6,7 @@
 #include <functional>
 #include <memory>
 #include <optional>
+#include <set>
 #include <span>
 #include <string>
 #include <vector>
@@ -66,7 +67,7 @@ class FlashStore {
     const FlashState m_factoryState;
     const std::shared_ptr<FlashFiles> m_files;
     mutable utils::Mutex m_damageMutex;
-    mutable std::string m_damage QUENX_GUARDED_BY(m_damageMutex);  ///< as it was last logged
+    mutable std::set<std::string> m_logged QUENX_GUARDED_BY(m_damageMutex);  ///< damage since the last change
 };
 
 }  // namespace ma
