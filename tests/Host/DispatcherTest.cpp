@@ -304,13 +304,6 @@ TEST_F(DispatcherTest, CarriesOutNothingForAnotherNamespace) {
     EXPECT_EQ(statusOf("Associators", "ObjectName"), 6);
     elsewhere.setNamespace("ROOT/CIMV2");
     EXPECT_EQ(statusOf("GetInstance", "InstanceName"), 0);
-    elsewhere.setNamespace("root/other");
-    const auto job = [&](const CimPath& path) {
-        return statusIn(invoke(gadget("a", "1"), "Work",
-                               {argument("Text", "x"), argument("Job", path, core::CimType::Reference)}));
-    };
-    EXPECT_EQ(job(elsewhere), 4);
-    EXPECT_EQ(job(gadget("a", "1")), 0);
 }
 
 TEST_F(DispatcherTest, CountsTheRefusalsOfAFlood) {

@@ -100,7 +100,7 @@ std::vector<AgentUse> CimBroker::useAgents() {
 }
 
 CimInstance* CimBroker::getInstanceByPath(CimPath& path) {
-    if (!path.isValid()) return nullptr;
+    if (!path.isValid() || !RequestScope::serves(path.getNamespace())) return nullptr;
     for (const AgentUse& use : useAgents()) {
         if (!use.agent().isClassSupported(path.getClassName())) continue;
         for (CimInstance* instance : InstanceRange(use.agent().getInstances(path.getClassName()))) {

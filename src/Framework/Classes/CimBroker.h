@@ -53,9 +53,10 @@ class QUENX_EXPORT CimBroker {
 
     /// Registers an agent; called once, from the agent's constructor, before its classes are added.
     virtual void addAgent(CimAgent* agent);
-    /// The instance that the path names, from whichever agent serves its class; null when there is none. It
-    /// stays owned by its class object and is good until the calling thread's request scope ends. Throws what
-    /// a class object throws.
+    /// The instance that the path names, from whichever agent serves its class; null when there is none, and
+    /// for a path of another namespace than the one that the calling thread's request is for. It stays owned
+    /// by its class object and is good until the calling thread's request scope ends. Throws what a class
+    /// object throws.
     virtual CimInstance* getInstanceByPath(CimPath& path);
     /// The instances of one class: of the named provider, or with an empty name of every provider that serves
     /// the class, joined in the order of registration. An unknown class yields an empty enumeration.

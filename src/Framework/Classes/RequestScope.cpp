@@ -5,11 +5,14 @@
 
 #include <utility>
 
+#include "Framework/Model/CimType.h"
+
 namespace core {
 
 namespace {
 
 thread_local RequestScope* currentScope = nullptr;
+thread_local const std::string* currentNamespace = nullptr;
 
 }  // namespace
 
@@ -24,7 +27,11 @@ AgentUse::~AgentUse() {
     m_registration->users.notify_all();
 }
 
-RequestScope::RequestScope() : m_outermost(currentScope == nullptr) {
+RequestScope::RequestScope(const std::string& servedNamespace) : RequestScope() {
+    currentNamespace = &servedNamespace;
+}
+
+RequestScope::RequestScope() : m_outermost(currentScope == nullptr), m_outerNamespace(currentNamespace) {
     if (!m_outermost) return;
     currentScope = this;
     // Cancelled in here, a host's thread would leave locks behind, and end the process at the first noexcept.
@@ -32,6 +39,7 @@ RequestScope::RequestScope() : m_outermost(currentScope == nullptr) {
 }
 
 RequestScope::~RequestScope() {
+    currentNamespace = m_outerNamespace;
     if (!m_outermost) return;
     currentScope = nullptr;
     // Instances go before their agents may.
@@ -42,6 +50,10 @@ RequestScope::~RequestScope() {
 
 RequestScope* RequestScope::current() {
     return currentScope;
+}
+
+bool RequestScope::serves(const std::string& namespaceName) {
+    return currentNamespace == nullptr || namespaceName.empty() || sameName(namespaceName, *currentNamespace);
 }
 
 void RequestScope::hold(std::shared_ptr<const void> object) {

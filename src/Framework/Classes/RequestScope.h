@@ -3,6 +3,7 @@
 
 #include <atomic>
 #include <memory>
+#include <string>
 #include <vector>
 
 #include "Utils/Export.h"
@@ -38,16 +39,23 @@ class QUENX_EXPORT AgentUse {
 /// One request of a client, on the calling thread. Whatever is enumerated, looked up or added meanwhile on
 /// this thread stays alive until the scope ends, so plain pointers to instances are good that long. The
 /// request layer opens one around each request; code that calls the broker itself opens its own. A scope
-/// inside a scope is part of the outer one.
+/// inside a scope is part of the outer one. Until the scope ends the thread cannot be cancelled: a
+/// pthread_cancel() takes effect after it.
 class QUENX_EXPORT RequestScope {
   public:
     RequestScope();
+    /// @param servedNamespace  the one that the request is for; has to outlive the scope
+    explicit RequestScope(const std::string& servedNamespace);
     ~RequestScope();
     RequestScope(const RequestScope&) = delete;
     RequestScope& operator=(const RequestScope&) = delete;
 
     /// The outermost scope of the calling thread; null when there is none.
     static RequestScope* current();
+
+    /// Whether a path of this namespace can name something for the calling thread's request: any can outside
+    /// a request for a namespace, and an empty one always means the namespace that is served.
+    static bool serves(const std::string& namespaceName);
 
     /// Keeps the object until the scope ends.
     void hold(std::shared_ptr<const void> object);
@@ -56,6 +64,7 @@ class QUENX_EXPORT RequestScope {
 
   private:
     bool m_outermost;
+    const std::string* m_outerNamespace;
     int m_cancelState = 0;
     std::vector<std::shared_ptr<const void>> m_held;
     std::vector<AgentUse> m_agents;

@@ -99,7 +99,7 @@ CimRequests::CimRequests(std::string namespaceName) : m_namespace(std::move(name
 
 std::vector<InstanceValue> CimRequests::enumerateInstances(const std::string& className,
                                                            const PropertyFilter& filter) {
-    return answerRequest([&](const ServedClasses& classes) {
+    return answerRequest(m_namespace, [&](const ServedClasses& classes) {
         const WantedProperties wanted(filter);
         std::vector<InstanceValue> result;
         visitInstances(classes, className, [&](CimInstance& instance, CimPath path) {
@@ -110,7 +110,7 @@ std::vector<InstanceValue> CimRequests::enumerateInstances(const std::string& cl
 }
 
 std::vector<CimPath> CimRequests::enumerateInstanceNames(const std::string& className) {
-    return answerRequest([&](const ServedClasses& classes) {
+    return answerRequest(m_namespace, [&](const ServedClasses& classes) {
         std::vector<CimPath> result;
         visitInstances(classes, className, [&](CimInstance&, CimPath path) {
             path.completeNamespace(m_namespace);
@@ -121,7 +121,7 @@ std::vector<CimPath> CimRequests::enumerateInstanceNames(const std::string& clas
 }
 
 InstanceValue CimRequests::getInstance(const CimPath& path, const PropertyFilter& filter) {
-    return answerRequest([&](const ServedClasses& classes) {
+    return answerRequest(m_namespace, [&](const ServedClasses& classes) {
         CimPath typed = classes.typed(path);
         CimInstance& instance = classes.requireInstance(typed);
         // Its own path: a client may have spelled names in another case.
@@ -130,7 +130,7 @@ InstanceValue CimRequests::getInstance(const CimPath& path, const PropertyFilter
 }
 
 void CimRequests::deleteInstance(const CimPath& path) {
-    answerRequest([&](const ServedClasses& classes) {
+    answerRequest(m_namespace, [&](const ServedClasses& classes) {
         CimPath typed = classes.typed(path);
         bool isSupported = false;
         for (const ServedClass* each : classes.named(typed.getClassName())) {
@@ -153,7 +153,7 @@ void CimRequests::deleteInstance(const CimPath& path) {
 
 MethodResult CimRequests::invokeMethod(const CimPath& path, const std::string& method,
                                        const std::vector<Argument>& arguments) {
-    return answerRequest([&](const ServedClasses& classes) -> MethodResult {
+    return answerRequest(m_namespace, [&](const ServedClasses& classes) -> MethodResult {
         const ClassChain chain = classes.chainOf(path.getClassName());
         // Not InvalidClass, which DSP0200 does not list for extrinsic methods.
         if (chain.empty()) {
@@ -179,11 +179,11 @@ MethodResult CimRequests::invokeMethod(const CimPath& path, const std::string& m
 }
 
 ClassChain CimRequests::getClass(const std::string& className) {
-    return ServedClasses().chainOf(className);
+    return ServedClasses(m_namespace).chainOf(className);
 }
 
 std::vector<ClassChain> CimRequests::enumerateClasses(const std::string& className, bool deep) {
-    const ServedClasses classes;
+    const ServedClasses classes(m_namespace);
     if (!className.empty()) classes.requireChain(className);
     // By name, since many served classes share their superclasses.
     std::map<std::string, ClassChain> found;

@@ -6,8 +6,9 @@
 namespace core {
 
 /// The request layer: what the providers loaded into this process answer. Every front (`quenxctl` in process,
-/// `quenx-cimd`) calls it. Classes are served in one namespace. Each operation is a request scope of its own;
-/// an exception out of a provider becomes CimStatus::Failed with its text.
+/// `quenx-cimd`) calls it. Classes are served in one namespace; a path of another one names nothing. Each
+/// operation is a request scope of its own; an exception out of a provider becomes CimStatus::Failed with its
+/// text.
 class QUENX_EXPORT CimRequests : public CimOperations {
   public:
     explicit CimRequests(std::string namespaceName);

@@ -62,6 +62,8 @@ bool leadsTo(const ServedClasses& classes, const AssociationFilter& by, const En
 /// The path of the object that the walk starts at, which need not exist. The classes in the filter must.
 CimPath startOf(const ServedClasses& classes, const CimPath& path, const AssociationFilter& by) {
     CimPath typed = classes.typed(path);
+    if (!RequestScope::serves(typed.getNamespace()))
+        throw CimError(CimStatus::NotFound, shownPath(typed) + " names no instance");
     for (const std::string& name : {by.associationClass, by.resultClass}) {
         if (!name.empty() && classes.chainOf(name).empty()) {
             throw CimError(CimStatus::InvalidParameter, "no class \"" + name + "\"");
@@ -127,7 +129,7 @@ void visitAssociations(const ServedClasses& classes, const CimPath& path, const 
 
 std::vector<InstanceValue> CimRequests::associators(const CimPath& path, const AssociationFilter& by,
                                                     const PropertyFilter& filter) {
-    return answerRequest([&](const ServedClasses& classes) {
+    return answerRequest(m_namespace, [&](const ServedClasses& classes) {
         const WantedProperties wanted(filter);
         std::vector<InstanceValue> result;
         InstanceFinder finder;
@@ -141,7 +143,7 @@ std::vector<InstanceValue> CimRequests::associators(const CimPath& path, const A
 }
 
 std::vector<CimPath> CimRequests::associatorNames(const CimPath& path, const AssociationFilter& by) {
-    return answerRequest([&](const ServedClasses& classes) {
+    return answerRequest(m_namespace, [&](const ServedClasses& classes) {
         std::vector<CimPath> result = farEnds(classes, path, by);
         for (CimPath& far : result)
             far.completeNamespace(m_namespace);
@@ -151,7 +153,7 @@ std::vector<CimPath> CimRequests::associatorNames(const CimPath& path, const Ass
 
 std::vector<InstanceValue> CimRequests::references(const CimPath& path, const AssociationFilter& by,
                                                    const PropertyFilter& filter) {
-    return answerRequest([&](const ServedClasses& classes) {
+    return answerRequest(m_namespace, [&](const ServedClasses& classes) {
         const WantedProperties wanted(filter);
         std::vector<InstanceValue> result;
         visitAssociations(classes, path, by, [&](CimInstance& association, CimPath own) {
@@ -162,7 +164,7 @@ std::vector<InstanceValue> CimRequests::references(const CimPath& path, const As
 }
 
 std::vector<CimPath> CimRequests::referenceNames(const CimPath& path, const AssociationFilter& by) {
-    return answerRequest([&](const ServedClasses& classes) {
+    return answerRequest(m_namespace, [&](const ServedClasses& classes) {
         std::vector<CimPath> result;
         visitAssociations(classes, path, by, [&](CimInstance&, CimPath own) {
             own.completeNamespace(m_namespace);

@@ -8,7 +8,7 @@
 
 namespace core {
 
-ServedClasses::ServedClasses() {
+ServedClasses::ServedClasses(const std::string& servedNamespace) : m_scope(servedNamespace) {
     // The scope goes on using the agents.
     for (const AgentUse& use : GetCimBroker()->useAgents()) {
         const auto classes = use.agent().getClasses().getAll();

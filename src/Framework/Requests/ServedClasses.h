@@ -14,7 +14,8 @@ namespace core {
 /// instances that the request meets stay alive. Used on the stack of one thread.
 class ServedClasses {
   public:
-    ServedClasses();
+    /// @param servedNamespace  in which paths name something; has to outlive the object
+    explicit ServedClasses(const std::string& servedNamespace);
 
     /// The classes that are of this class: itself and its subclasses, by every agent; empty for one
     /// that is only mentioned. CimError (invalid class) when it is unknown.
@@ -46,11 +47,12 @@ class ServedClasses {
 };
 
 /// Runs the body of a request on what is served; it fails with CimError only.
+/// @param servedNamespace  in which paths name something
 template <class Body>
-auto answerRequest(Body&& body) {
+auto answerRequest(const std::string& servedNamespace, Body&& body) {
     // Declared first: it keeps the provider's library, and with it the type of what it throws, loaded until
     // the exception is converted.
-    const ServedClasses classes;
+    const ServedClasses classes(servedNamespace);
     try {
         return body(classes);
     } catch (...) {

@@ -33,14 +33,6 @@ std::string shownText(const std::exception& error) {
     return std::string(whole.substr(0, shown));
 }
 
-/// Refuses the path of another namespace: its keys may name something here as well, which is not what the
-/// client means, nor what the audit trail would say.
-void requireHere(const core::CimPath& path, const std::string& namespaceName, CimStatus otherwise) {
-    if (core::sameName(path.getNamespace(), namespaceName)) return;
-    throw CimError(otherwise,
-                   core::shownPath(path) + " names nothing in namespace \"" + namespaceName + "\"");
-}
-
 /// Whether the call changes something, or would. No method is known to change nothing: a check claims its
 /// adapter.
 bool isAudited(const cimxml::Request& request) {
@@ -89,10 +81,6 @@ IntrinsicResult Dispatcher::callOperation(const cimxml::IntrinsicCall& call, con
     if (operation == nullptr) {
         throw CimError(CimStatus::NotSupported, "operation " + call.operation + " is not supported");
     }
-    for (const cimxml::Parameter& parameter : call.parameters) {
-        if (const auto* path = std::get_if<core::CimPath>(&parameter.value))
-            requireHere(*path, call.namespaceName, CimStatus::NotFound);
-    }
     return operation->handler({target, caller, m_enumerations, charge},
                               Parameters(call, operation->parameters));
 }
@@ -104,15 +92,6 @@ core::MethodResult Dispatcher::callMethod(const cimxml::MethodCall& call, const 
     if (!call.mistypedArgument.empty()) {
         throw CimError(CimStatus::InvalidParameter,
                        "parameter " + call.mistypedArgument + " does not hold a value of its stated type");
-    }
-    for (const core::Argument& argument : call.arguments) {
-        const auto require = [&](const core::CimScalar& scalar) {
-            if (const auto* path = std::get_if<core::CimPath>(&scalar))
-                requireHere(*path, call.object.getNamespace(), CimStatus::InvalidParameter);
-        };
-        if (const core::CimScalar* single = argument.value.scalar()) require(*single);
-        if (const auto* elements = argument.value.elements())
-            std::for_each(elements->begin(), elements->end(), require);
     }
     return target.invokeMethod(call.object, call.method, call.arguments);
 }

@@ -68,6 +68,13 @@ std::vector<std::string> InteropNamespace::sources(const std::string& className)
     return names;
 }
 
+CimPath InteropNamespace::atProviders(CimPath path) const {
+    if (!path.getNamespace().empty() && !core::sameName(path.getNamespace(), m_name))
+        throw core::CimError(core::CimStatus::NotFound, core::shownPath(path) + " names no instance");
+    path.setNamespace("");
+    return path;
+}
+
 void InteropNamespace::relocate(CimPath& path) const {
     // A client comes back with the path, so it has to name the namespace in which its instance is served.
     std::vector<core::CimKey> keys = path.getKeys();
@@ -112,7 +119,7 @@ std::vector<CimPath> InteropNamespace::enumerateInstanceNames(const std::string&
 
 InstanceValue InteropNamespace::getInstance(const CimPath& path, const core::PropertyFilter& filter) {
     if (!sources(path.getClassName()).empty()) {
-        InstanceValue instance = m_implementation->getInstance(path, filter);
+        InstanceValue instance = m_implementation->getInstance(atProviders(path), filter);
         relocate(instance);
         return instance;
     }
@@ -132,7 +139,7 @@ bool InteropNamespace::hasAssociations(const CimPath& path, const core::Associat
         leads = false;  // the filter allows the manager's own classes alone, and those have no associations
     }
     if (!sources(path.getClassName()).empty()) return leads;
-    typedOwnPath(path);
+    atProviders(typedOwnPath(path));
     return false;
 }
 
@@ -140,26 +147,26 @@ std::vector<InstanceValue> InteropNamespace::associators(const CimPath& path,
                                                          const core::AssociationFilter& by,
                                                          const core::PropertyFilter& filter) {
     if (!hasAssociations(path, by)) return {};
-    return relocated(m_implementation->associators(path, by, filter));
+    return relocated(m_implementation->associators(atProviders(path), by, filter));
 }
 
 std::vector<CimPath> InteropNamespace::associatorNames(const CimPath& path,
                                                        const core::AssociationFilter& by) {
     if (!hasAssociations(path, by)) return {};
-    return relocated(m_implementation->associatorNames(path, by));
+    return relocated(m_implementation->associatorNames(atProviders(path), by));
 }
 
 std::vector<InstanceValue> InteropNamespace::references(const CimPath& path,
                                                         const core::AssociationFilter& by,
                                                         const core::PropertyFilter& filter) {
     if (!hasAssociations(path, by)) return {};
-    return relocated(m_implementation->references(path, by, filter));
+    return relocated(m_implementation->references(atProviders(path), by, filter));
 }
 
 std::vector<CimPath> InteropNamespace::referenceNames(const CimPath& path,
                                                       const core::AssociationFilter& by) {
     if (!hasAssociations(path, by)) return {};
-    return relocated(m_implementation->referenceNames(path, by));
+    return relocated(m_implementation->referenceNames(atProviders(path), by));
 }
 
 core::MethodResult InteropNamespace::invokeMethod(const CimPath& path, const std::string& method,

@@ -56,6 +56,9 @@ class InteropNamespace : public core::CimOperations {
     /// the manager's own classes, none do. CimError when the path or the filter is wrong.
     bool hasAssociations(const core::CimPath& path, const core::AssociationFilter& by) const;
 
+    /// The path as the providers know it. CimError (not found) for that of another namespace than this one.
+    core::CimPath atProviders(core::CimPath path) const;
+
     void relocate(core::CimPath& path) const;
     void relocate(core::InstanceValue& instance) const;
     /// What the providers answer, as it stands in this namespace.

@@ -129,10 +129,14 @@ TEST_F(ConcreteJobTest, IsAllThatCanBeDeletedAndFlashesOn) {
 
     m_backend->hold("writeFlashImage");
     core::CimPath running = *install(goodImage(), "eth0").job;
+    core::CimPath elsewhere = running;
+    elsewhere.setNamespace("root/other");
+    EXPECT_THROW(m_requests.deleteInstance(elsewhere), core::CimError);
     EXPECT_EQ(registry.DeleteInstance(running), 0);
     EXPECT_EQ(registry.DeleteInstance(running), 90);
-    EXPECT_TRUE(test::SyslogCapture::contains(
-        "Quenx_ConcreteJobe_Provider.DeleteInstance: instance not found '" + running.toString() + "' (%s)"));
+    for (const core::CimPath& path : {elsewhere, running})
+        EXPECT_TRUE(test::SyslogCapture::contains(
+            "Quenx_ConcreteJobe_Provider.DeleteInstance: instance not found '" + path.toString() + "' (%s)"));
     EXPECT_TRUE(m_requests.enumerateInstances("Quenx_ConcreteJob").empty());
     // The adapter stays claimed until the flash has ended.
     EXPECT_EQ(install(goodImage(), "eth1").returnValue, 2U);

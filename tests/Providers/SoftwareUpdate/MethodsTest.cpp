@@ -157,6 +157,8 @@ class MethodsTest : public test::UpdateTest {
         const CimPath missing(std::string("Quenx_SoftwareIdentity.InstanceID=\"Quenx:none\""));
         const CimPath nowhere(std::string("Quenx_EthernetPort.DeviceID=\"a \\\"quoted\\\\ one\""));
         const CimPath noPath(std::string("no path at all"));
+        CimPath elsewhere = m_port;
+        elsewhere.setNamespace("root/other");
         const CimPath installed(std::string("Quenx_SoftwareIdentity.InstanceID=\"Quenx:eth0:IMG_PXE\""));
         auto foreign = madeRom({{FirmwareType::PXE, 2}});
         foreign[foreign[ma::rom::kHeaderDataStructure] + ma::rom::kPcirCodeType] =
@@ -171,6 +173,7 @@ class MethodsTest : public test::UpdateTest {
         std::vector<Row> rows = {
             {fromUri(m_uri, nowhere), 5, {notFound + nowhere.toString() + "'"}},
             {fromUri(m_uri, noPath), 5, {notFound + noPath.toString() + "'"}},
+            {fromUri(m_uri, elsewhere), 5, {notFound + elsewhere.toString() + "'"}},
             {fromUri(m_uri, m_controller), kJobStarted, {"Output size of file: 2048"}},
             // For targets all speak alike.
             {fromUri(m_uri, service()), 4106, {noTarget}},
@@ -187,6 +190,7 @@ class MethodsTest : public test::UpdateTest {
                  {installed, m_port,
                   noSource + installed.toString() + "'. It is not a proper Firmware Image."},
                  {m_image, nowhere, notFound + nowhere.toString() + "'"},
+                 {m_image, elsewhere, notFound + elsewhere.toString() + "'"},
              }) {
             rows.push_back({check(source, target), 5, {"Checking " + line}});
             rows.push_back({fromIdentity(source, target), 5, {line}});
@@ -229,7 +233,8 @@ class MethodsTest : public test::UpdateTest {
         EXPECT_TRUE(m_requests.enumerateInstances("Quenx_ConcreteJob").empty());
     }
     void expectOfCheckInProcess(const Row& row) const {
-        const core::RequestScope scope;
+        const std::string served = "root/cimv2";
+        const core::RequestScope scope(served);
         CimPath path = service();
         auto* check = dynamic_cast<update::ImageCheck*>(core::GetCimBroker()->getInstanceByPath(path));
         ASSERT_NE(check, nullptr);
