@@ -1,4 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
+#include <thread>
+
 #include "Host/DispatcherFixture.h"
 #include "Support/SyslogCapture.h"
 
@@ -325,6 +327,13 @@ TEST_F(DispatcherTest, CountsTheRefusalsOfAFlood) {
     EXPECT_EQ(test::SyslogCapture::lines().back().text,
               "[audit] user=\"a\" address=\"192.0.2.1\" operation=\"Work\" target=\"\" arguments=\"\" "
               "outcome=\"denied: 5 more within a minute\"");
+    // Nor does the number wait for somebody to come by.
+    host::AuditTrail quick(std::chrono::milliseconds(1));
+    test::SyslogCapture::clear();
+    for (int i = 0; i < 21; ++i)
+        quick.refused({"b", "192.0.2.1", "Work", "t", "denied: x"}, {}, now);
+    while (!test::SyslogCapture::contains("denied: 1 more"))
+        std::this_thread::yield();
 }
 
 }  // namespace

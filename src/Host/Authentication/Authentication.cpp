@@ -69,8 +69,8 @@ HeldSlot::HeldSlot(Slots& slots, std::chrono::milliseconds patience, const std::
 }
 
 Authentication::Authentication(std::unique_ptr<PasswordChecker> checker, std::chrono::seconds rememberFor,
-                               const LoginPace& pace)
-    : m_checker(std::move(checker)), m_cache(rememberFor), m_queue(pace) {}
+                               const LoginPace& pace, std::shared_ptr<AuditTrail> trail)
+    : m_checker(std::move(checker)), m_cache(rememberFor), m_trail(std::move(trail)), m_queue(pace) {}
 
 AuthenticationResult Authentication::authenticate(const std::optional<std::string>& header,
                                                   const std::string& address, const std::stop_token& ended) {
@@ -86,7 +86,7 @@ AuthenticationResult Authentication::authenticate(const std::optional<std::strin
     const auto& user = checked->user;
     if (user && user->mayRead) return {AuthenticationOutcome::Accepted, *user};
     if (user) {
-        m_trail.refused({credentials->user, address, "login", "", "denied: not admitted"}, {});
+        m_trail->refused({credentials->user, address, "login", "", "denied: not admitted"}, {});
         return {AuthenticationOutcome::Forbidden, *user};
     }
     core::audit({credentials->user, address, "login", "", "denied: wrong user or password"});

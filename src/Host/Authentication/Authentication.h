@@ -99,8 +99,10 @@ struct AuthenticationResult {
 /// calling connection's own and takes nobody else's place. Thread-safe.
 class Authentication {
   public:
+    /// @param trail  of refusals; one for all that refuse
     Authentication(std::unique_ptr<PasswordChecker> checker, std::chrono::seconds rememberFor,
-                   const LoginPace& pace = {});
+                   const LoginPace& pace = {},
+                   std::shared_ptr<AuditTrail> trail = std::make_shared<AuditTrail>());
 
     /// @param ended  the client does not wait any more, so nothing is waited for
     AuthenticationResult authenticate(const std::optional<std::string>& header, const std::string& address,
@@ -122,7 +124,7 @@ class Authentication {
 
     std::unique_ptr<PasswordChecker> m_checker;
     CredentialCache m_cache;
-    AuditTrail m_trail;
+    const std::shared_ptr<AuditTrail> m_trail;
     LoginQueue m_queue;
 };
 

@@ -118,7 +118,7 @@ std::unique_ptr<Dispatcher> Daemon::makeDispatcher() const {
     for (std::size_t i = 1; i < names.size(); ++i)
         namespaces.push_back(std::make_shared<InteropNamespace>(names[i], implementation, model));
     return std::make_unique<Dispatcher>(std::move(namespaces), m_settings.pulls,
-                                        m_settings.limits.answerBytes);
+                                        m_settings.limits.answerBytes, m_trail);
 }
 
 std::unique_ptr<Authentication> Daemon::makeAuthentication() const {
@@ -130,7 +130,7 @@ std::unique_ptr<Authentication> Daemon::makeAuthentication() const {
     } else {
         checker = std::make_unique<PamChecker>(settings.readers);
     }
-    return std::make_unique<Authentication>(std::move(checker), settings.rememberFor);
+    return std::make_unique<Authentication>(std::move(checker), settings.rememberFor, LoginPace(), m_trail);
 }
 
 void Daemon::listenOn(std::uint16_t port, bool tls) {

@@ -83,6 +83,7 @@ class Daemon {
     // Destroyed last to first: the server lets go of its requests before the providers leave.
     core::ProviderSession m_session;
     std::optional<JobRetention> m_retention;
+    const std::shared_ptr<AuditTrail> m_trail = std::make_shared<AuditTrail>();
     std::unique_ptr<Dispatcher> m_dispatcher;
     std::unique_ptr<Authentication> m_authentication;
     std::unique_ptr<HttpServer> m_server;

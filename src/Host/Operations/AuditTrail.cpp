@@ -1,14 +1,16 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Host/Operations/AuditTrail.h"
 
+#include <condition_variable>
+#include <mutex>
 #include <new>
+#include <system_error>
 
 namespace host {
 
 namespace {
 
 constexpr unsigned int kListed = 20;
-constexpr std::chrono::minutes kCounted{1};
 constexpr std::size_t kLongestName = 65;  // of an operation: one more than a line shows
 
 }  // namespace
@@ -28,12 +30,36 @@ void AuditTrail::refused(const core::AuditEvent& event, const std::vector<core::
     {
         const utils::Mutex::AutoLocker lock(m_mutex);
         Minute& minute = m_minutes[event.user];
-        if (minute.refusals == 0) minute.end = now + kCounted;
+        if (minute.refusals == 0) minute.end = now + m_minute;
         refusals = ++minute.refusals;
-        if (refusals > kListed)
+        if (refusals > kListed) {
             minute.last = {event.user, event.address, event.operation.substr(0, kLongestName), "", ""};
+            startWriter();
+        }
     }
     if (refusals <= kListed) core::audit(event, arguments);
+}
+
+void AuditTrail::startWriter() {
+    if (m_writer.joinable()) return;
+    try {
+        m_writer = std::jthread([this](const std::stop_token& stop) { run(stop); });
+    } catch (const std::system_error&) {
+        // The next call writes the number, or starts the thread.
+    }
+}
+
+void AuditTrail::run(const std::stop_token& stop) {
+    std::mutex mutex;
+    std::condition_variable_any stopped;  // nobody calls it: only the time or the stop ends a wait
+    std::unique_lock lock(mutex);
+    while (!stopped.wait_for(lock, stop, m_minute, [&] { return stop.stop_requested(); })) {
+        try {
+            writeNumbers();
+        } catch (const std::bad_alloc&) {
+            // A minute later there may be memory.
+        }
+    }
 }
 
 void AuditTrail::writeNumbers(Clock::time_point now) {

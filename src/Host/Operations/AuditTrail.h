@@ -4,6 +4,7 @@
 #include <chrono>
 #include <map>
 #include <string>
+#include <thread>
 #include <vector>
 
 #include "Framework/Requests/Audit.h"
@@ -13,13 +14,13 @@
 namespace host {
 
 /// What users who are known may not do, in the audit trail: twenty lines a minute for each, the rest as their
-/// number. A refusal costs nothing, and thousands of them would drown what others do: log services drop what
-/// comes too fast, whosever it is. Thread-safe.
+/// number, which a thread of its own writes when the minute is over. A refusal costs nothing, and thousands
+/// of them would drown what others do: log services drop what comes too fast, whosever it is. Thread-safe.
 class AuditTrail {
   public:
     using Clock = std::chrono::steady_clock;
 
-    AuditTrail() = default;
+    explicit AuditTrail(Clock::duration minute = std::chrono::minutes(1)) : m_minute(minute) {}
     AuditTrail(const AuditTrail&) = delete;
     AuditTrail& operator=(const AuditTrail&) = delete;
     /// Writes the numbers that are still owed.
@@ -29,7 +30,7 @@ class AuditTrail {
     /// @throws std::bad_alloc
     void refused(const core::AuditEvent& event, const std::vector<core::Argument>& arguments,
                  Clock::time_point now = Clock::now());
-    /// Writes the numbers of the minutes that are over. To be called now and then.
+    /// Writes the numbers of the minutes that are over.
     /// @throws std::bad_alloc
     void writeNumbers(Clock::time_point now = Clock::now());
 
@@ -40,8 +41,13 @@ class AuditTrail {
         unsigned int refusals = 0;
     };
 
+    void startWriter() QUENX_REQUIRES(m_mutex);
+    void run(const std::stop_token& stop);
+
+    const Clock::duration m_minute;
     utils::Mutex m_mutex;
     std::map<std::string, Minute> m_minutes QUENX_GUARDED_BY(m_mutex);  ///< by user
+    std::jthread m_writer QUENX_GUARDED_BY(m_mutex);                    // last: it uses the others
 };
 
 }  // namespace host

@@ -3,6 +3,7 @@
 
 #include <algorithm>
 #include <new>
+#include <utility>
 
 #include "Framework/Requests/Audit.h"
 
@@ -62,8 +63,12 @@ std::string targetOf(const cimxml::IntrinsicCall& call) {
 
 }  // namespace
 
-Dispatcher::Dispatcher(Namespaces namespaces, const PullLimits& limits, std::size_t answerBytes)
-    : m_namespaces(std::move(namespaces)), m_budget(answerBytes), m_enumerations(limits) {}
+Dispatcher::Dispatcher(Namespaces namespaces, const PullLimits& limits, std::size_t answerBytes,
+                       std::shared_ptr<AuditTrail> trail)
+    : m_namespaces(std::move(namespaces)),
+      m_budget(answerBytes),
+      m_enumerations(limits),
+      m_trail(std::move(trail)) {}
 
 core::CimOperations& Dispatcher::findNamespace(const std::string& name) const {
     for (const auto& each : m_namespaces) {
@@ -103,13 +108,13 @@ void Dispatcher::audit(const cimxml::Request& request, const Caller& caller,
     const auto* method = std::get_if<cimxml::MethodCall>(&request.call);
     event.target = method != nullptr ? method->object.toString()
                                      : targetOf(std::get<cimxml::IntrinsicCall>(request.call));
-    const std::vector<core::Argument> arguments =
-        method != nullptr ? method->arguments : std::vector<core::Argument>();
+    static const std::vector<core::Argument> none;
+    const std::vector<core::Argument>& arguments = method != nullptr ? method->arguments : none;
     const auto* error = std::get_if<ErrorResult>(&response.content);
     if (error != nullptr && error->status == CimStatus::AccessDenied) {
-        m_trail.refused(event, arguments);
+        m_trail->refused(event, arguments);
     } else {
-        m_trail.writeNumbers();
+        m_trail->writeNumbers();
         core::audit(event, arguments);
     }
 } catch (const std::bad_alloc&) {

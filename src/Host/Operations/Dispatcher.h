@@ -17,8 +17,10 @@ class Dispatcher {
   public:
     using Namespaces = std::vector<std::shared_ptr<core::CimOperations>>;
 
+    /// @param trail  of refusals; one for all that refuse
     explicit Dispatcher(Namespaces namespaces, const PullLimits& limits = {},
-                        std::size_t answerBytes = ServerLimits().answerBytes);
+                        std::size_t answerBytes = ServerLimits().answerBytes,
+                        std::shared_ptr<AuditTrail> trail = std::make_shared<AuditTrail>());
 
     /// A charge for an answer to the user.
     AnswerCharge charge(const std::string& user) { return {m_budget, user}; }
@@ -43,7 +45,7 @@ class Dispatcher {
     const Namespaces m_namespaces;
     AnswerBudget m_budget;
     OpenEnumerations m_enumerations;
-    AuditTrail m_trail;
+    const std::shared_ptr<AuditTrail> m_trail;
     std::atomic<bool> m_shuttingDown{false};
 };
 
