@@ -10,6 +10,7 @@
 #include "Cli/Display/Messages.h"
 #include "Framework/Requests/ProviderSession.h"
 #include "MidAPI/ma.h"
+#include "Utils/Os/Linux/linux.h"
 
 namespace cli {
 
@@ -20,7 +21,7 @@ void requireReadable(const std::string& file, const std::string& what) {
     if (std::filesystem::is_directory(file, error))
         throw CommandError(ExitStatus::WrongUse, "The " + what + " " + file + " is a directory.",
                            "Name a file.");
-    if (std::filesystem::is_other(file, error))
+    if (os::isSpecialFile(file))
         throw CommandError(ExitStatus::WrongUse, "The " + what + " " + file + " is not a regular file.",
                            "Name a file.");
     if (access(file.c_str(), R_OK) == 0) return;

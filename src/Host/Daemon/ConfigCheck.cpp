@@ -104,7 +104,7 @@ void checkProviderConfiguration(const std::string& path) {
         throw std::runtime_error("Cannot read " + path + ": " + std::strerror(errno) +
                                  ". Check providers.configuration.");
     }
-    if (!path.empty() && !fs::is_regular_file(path))
+    if (os::isSpecialFile(path) || fs::is_directory(path))
         throw std::runtime_error(path + " is not a regular file. Check providers.configuration.");
 }
 

@@ -1,7 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 #include <algorithm>
-#include <cstdint>
-#include <filesystem>
+#include <optional>
 #include <stdexcept>
 
 #include "Host/Daemon/SettingsField.h"
@@ -69,18 +68,15 @@ std::string hintAt(std::string_view text, std::size_t line) {
     return ". A text must stand in quotes: " + utils::trim(text.substr(0, equals)) + " = \"" + value + "\"";
 }
 
+std::string textOf(const std::string& file) try {
+    if (const auto text = os::readTextFile(file)) return *text;
+    throw std::runtime_error("There is no file " + file + ". Check --config.");
+} catch (const os::UnusableFile& error) {
+    throw std::runtime_error(file + " " + error.what() + ". Check --config.");
+}
+
 toml::table parse(const std::string& file) {
-    constexpr std::size_t kLargest = std::size_t{1} << 20;
-    std::error_code unknown;  // then reading it says why
-    const auto status = std::filesystem::status(file, unknown);
-    // A pipe would be taken for an empty file, and a device may never end.
-    if (std::filesystem::is_other(status))
-        throw std::runtime_error(file + " is not a regular file. Check --config.");
-    const auto bytes = os::readWholeFile(file, kLargest + 1);
-    if (bytes && bytes->size() > kLargest)
-        throw std::runtime_error(file + " is larger than 1 MiB, so it is no configuration. Check --config.");
-    if (!bytes) throw std::runtime_error("There is no file " + file + ". Check --config.");
-    const std::string_view text(reinterpret_cast<const char*>(bytes->data()), bytes->size());
+    const std::string text = textOf(file);
     try {
         return ma::parseToml(text);
     } catch (const ma::TomlError& error) {

@@ -5,13 +5,12 @@
 
 #include <array>
 #include <cerrno>
-#include <cstdint>
 #include <cstring>
 #include <ctime>
-#include <filesystem>
 #include <memory>
 #include <stdexcept>
 #include <system_error>
+#include <utility>
 
 #include "Utils/Os/Linux/linux.h"
 
@@ -31,14 +30,10 @@ void check(int status, const std::string& file) {
 }
 
 std::string readPem(const std::string& file) {
-    std::error_code unknown;  // then reading it says why
-    // A FIFO would give what somebody else writes into it, and a device may never end.
-    if (const auto found = std::filesystem::status(file, unknown);
-        std::filesystem::exists(found) && !std::filesystem::is_regular_file(found))
-        fail(file, "it is not a regular file");
     try {
-        constexpr std::size_t kLargest = 1 << 20;  // bytes; a chain of eight has some twenty thousand
-        if (const auto bytes = os::readWholeFile(file, kLargest)) return {bytes->begin(), bytes->end()};
+        if (auto text = os::readTextFile(file)) return std::move(*text);
+    } catch (const os::UnusableFile& error) {
+        fail(file, std::string("it ") + error.what());
     } catch (const std::system_error& error) {
         if (error.code().value() != EACCES) fail(file, error.code().message());
         throw std::runtime_error("Cannot read " + file + ": " + error.code().message() +

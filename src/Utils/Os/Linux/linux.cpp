@@ -132,6 +132,21 @@ std::optional<std::vector<std::uint8_t>> readWholeFile(const std::string& path, 
     return bytes;
 }
 
+bool isSpecialFile(const std::string& path) noexcept {
+    struct stat status {};
+    return stat(path.c_str(), &status) == 0 && !S_ISREG(status.st_mode) && !S_ISDIR(status.st_mode);
+}
+
+std::optional<std::string> readTextFile(const std::string& path) {
+    constexpr std::size_t kLargest = std::size_t{1} << 20;
+    // A FIFO gives what somebody else writes into it, and a device may never end.
+    if (isSpecialFile(path)) throw UnusableFile("is not a regular file");
+    const auto bytes = readWholeFile(path, kLargest + 1);
+    if (!bytes) return std::nullopt;
+    if (bytes->size() > kLargest) throw UnusableFile("is larger than 1 MiB");
+    return std::string(bytes->begin(), bytes->end());
+}
+
 void ignoreOtherSignals() noexcept {
     for (const int each : {SIGPIPE, SIGXFSZ, SIGUSR1, SIGUSR2, SIGALRM, SIGVTALRM, SIGPROF, SIGIO, SIGPWR})
         static_cast<void>(signal(each, SIG_IGN));

@@ -7,6 +7,7 @@
 #include <cstdint>
 #include <optional>
 #include <span>
+#include <stdexcept>
 #include <string>
 #include <utility>
 #include <vector>
@@ -56,6 +57,19 @@ QUENX_EXPORT std::size_t readFile(const std::string& path, std::span<std::uint8_
 /// never blocks. @throws std::system_error "cannot read PATH: REASON"
 QUENX_EXPORT std::optional<std::vector<std::uint8_t>> readWholeFile(const std::string& path,
                                                                     std::size_t most);
+
+/// True for a FIFO, a device and the like: what a person named by mistake for a file, and should not be
+/// opened.
+QUENX_EXPORT bool isSpecialFile(const std::string& path) noexcept;
+
+/// The text of a file that a person named: settings, a certificate. Nothing when there is no such file.
+/// @throws std::system_error "cannot read PATH: REASON"
+/// @throws UnusableFile "is not a regular file", "is larger than 1 MiB"
+QUENX_EXPORT std::optional<std::string> readTextFile(const std::string& path);
+class QUENX_EXPORT UnusableFile : public std::runtime_error {
+  public:
+    using std::runtime_error::runtime_error;
+};
 
 /// Has this process ignore the signals that mean nothing to it and would end it, in a flash too: a client or
 /// a reader that goes away, a file that may not grow, timers and user signals. For the first lines of main().
