@@ -6,9 +6,9 @@
 #include <algorithm>
 #include <cerrno>
 #include <filesystem>
-#include <iterator>
 #include <system_error>
 
+#include "MidAPI/Image/ImagePreparation.h"
 #include "Utils/Os/Linux/linux.h"
 #include "Utils/Utils.h"
 
@@ -79,15 +79,13 @@ ImageFile readImage(const std::string& path) try {
     return {path, cannotRead(path, error.code().value()), {}};
 }
 
-/// The images that are written for these types: each whole, also when it carries a type besides.
-/// @param types  those asked for; none means all
+/// The images that are written for these types. @param types  as ma::assessImage() takes them, by name
 ma::RomFile chosenOf(const ma::RomFile& rom, const std::vector<std::string>& types) {
-    ma::RomFile chosen;
-    std::ranges::copy_if(rom.images, std::back_inserter(chosen.images), [&](const ma::RomImage& image) {
-        if (types.empty()) return image.type != utils::FirmwareType{};
-        return std::ranges::any_of(types, [&](const auto& type) { return carries(image, type); });
-    });
-    return chosen;
+    std::vector<utils::FirmwareType> requested;
+    for (const std::string& type : types) {
+        if (const auto known = ma::firmwareTypeFromName(type)) requested.push_back(*known);
+    }
+    return ma::chooseImages(rom, std::move(requested));
 }
 
 /// Another PXE image would take the one with the CLP entry point away, so the same version is not the same.

@@ -90,14 +90,15 @@ std::string downgrade(const PreparationTarget& target, const RomFile& chosen) {
     return {};
 }
 
-RomFile chooseImages(const RomFile& rom, const Types& requested) {
+}  // namespace
+
+RomFile chooseImages(const RomFile& rom, std::vector<utils::FirmwareType> requested) {
+    const Types wanted = distinctTypes(std::move(requested));
     RomFile chosen;
     std::copy_if(rom.images.begin(), rom.images.end(), std::back_inserter(chosen.images),
-                 [&requested](const RomImage& image) { return isWanted(image, requested); });
+                 [&wanted](const RomImage& image) { return isWanted(image, wanted); });
     return chosen;
 }
-
-}  // namespace
 
 Preparation assessImage(const PreparationTarget& target, std::span<const std::uint8_t> file,
                         const std::vector<utils::FirmwareType>& requested) {

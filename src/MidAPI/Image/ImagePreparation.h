@@ -38,6 +38,10 @@ struct Preparation {
 QUENX_EXPORT Preparation assessImage(const PreparationTarget& target, std::span<const std::uint8_t> file,
                                      const std::vector<utils::FirmwareType>& requested);
 
+/// The images that are written for `requested` types (as above): each whole, also when it carries a type
+/// besides.
+QUENX_EXPORT RomFile chooseImages(const RomFile& rom, std::vector<utils::FirmwareType> requested);
+
 /// True when the output of the preparation is an image that may be written.
 QUENX_EXPORT bool hasOutput(PrepareStatus status);
 
