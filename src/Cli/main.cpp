@@ -21,8 +21,6 @@ namespace cli {
 
 namespace {
 
-constexpr const char* kAskLog = "The system log has the details.";
-
 std::atomic<bool> interruptionAsked{false};
 static_assert(std::atomic<bool>::is_always_lock_free, "a signal handler stores it");
 

@@ -26,6 +26,15 @@ Uri::SupportedURISchemes findScheme(const std::string& word, const std::string& 
     return Uri::SupportedURISchemes::Unknown;
 }
 
+bool hasSize(const std::string& path, const os::FileLook& look) {
+    try {
+        os::getFileSize(path, look);
+        return true;
+    } catch (...) {
+        return false;
+    }
+}
+
 }  // namespace
 
 Uri::Uri(std::string text) : m_supportedUri{SupportedURISchemes::File} {
@@ -57,24 +66,22 @@ bool Uri::IsUriSupported() const {
 }
 
 bool Uri::IsUriAccesible() const {
-    if (!IsUriSupported()) return false;
+    if (!isLocalFile()) return false;
     // Opened, not only looked at: a file that the service may not read is not accessible.
     try {
         os::Patience patience;
-        return IsUriAccesible(os::lookAtFile(m_sourcePath, -1, patience).value_or(os::FileLook()));
+        return hasSize(m_sourcePath, os::lookAtFile(m_sourcePath, -1, patience).value_or(os::FileLook()));
     } catch (...) {
         return false;
     }
 }
 
 bool Uri::IsUriAccesible(const os::FileLook& look) const {
-    if (!IsUriSupported() || m_scheme != SupportedURISchemes::File) return false;
-    try {
-        os::getFileSize(m_sourcePath, look);
-        return true;
-    } catch (...) {
-        return false;
-    }
+    return isLocalFile() && hasSize(m_sourcePath, look);
+}
+
+bool Uri::isLocalFile() const {
+    return IsUriSupported() && m_scheme == SupportedURISchemes::File;
 }
 
 }  // namespace utils

@@ -41,6 +41,8 @@ class QUENX_EXPORT Uri {
     SupportedURISchemes getScheme() const { return m_scheme; }
 
   private:
+    bool isLocalFile() const;
+
     std::vector<SupportedURISchemes> m_supportedUri;
     SupportedURISchemes m_scheme = SupportedURISchemes::Unknown;
     std::string m_sourcePath;

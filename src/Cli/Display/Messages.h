@@ -24,6 +24,9 @@ enum class ExitStatus {
     Interrupted = 6,     ///< by the user; an update that a server has begun goes on
 };
 
+/// The advice where the program knows no better.
+inline constexpr const char* kAskLog = "The system log may have the details.";
+
 /// What happened and what to do next, each one or two sentences. The advice may be empty.
 struct Explanation {
     std::string message;

@@ -24,7 +24,8 @@ bool isSet(const char* variable) {
 
 /// Controls, U+0080 to U+009F among them, move the cursor and more. Marks, overrides and isolates of the
 /// direction (U+061C, U+200E, U+200F, U+202A to U+202E, U+2066 to U+2069), line separators (U+2028, U+2029)
-/// and what nobody sees (U+00AD, U+200B to U+200D, U+2060 to U+2065, U+FEFF) make a text look like another.
+/// and what nobody sees (U+00AD, U+200B to U+200D, U+2060 to U+2065, U+206A to U+206F, U+FEFF) make a text
+/// look like another.
 bool drivesTerminal(std::string_view character) {
     const auto isWithin = [&](std::string_view lead, char first, char last) {
         return character.size() == lead.size() + 1 && character.starts_with(lead) &&

@@ -13,8 +13,8 @@ namespace {
 /// Nothing where the return value's meaning is the best explanation.
 using Reason = std::optional<Explanation>;
 
-constexpr const char* kAskLog =
-    "The system log has the details; for more of them, set TARVEL_SMASHv2_LOG_LEVEL=2 and try again.";
+constexpr const char* kAskLogAgain =
+    "The system log may have the details; for more of them, set TARVEL_SMASHv2_LOG_LEVEL=2 and try again.";
 
 struct ReturnValueText {
     std::uint32_t value;
@@ -39,7 +39,7 @@ constexpr ReturnValueText kReturnValues[] = {
     {4098, "The service cannot install unattended.", "Install with the adapter maker's own tool."},
     {4099, "The image is older than the installed firmware, or has other image types.",
      "Use a newer image, or install this one with --force."},
-    {4100, "The service ran out of memory or met an unexpected error.", kAskLog},
+    {4100, "The service ran out of memory or met an unexpected error.", kAskLogAgain},
     {4101, "The service has too little swap space.", "Free some memory and try again."},
     {4102, "The service cannot update the installed version to this one.",
      "Install a version in between first."},
@@ -57,7 +57,7 @@ Explanation explainReturnValue(std::uint32_t value) {
     for (const ReturnValueText& row : kReturnValues) {
         if (row.value == value) return {row.meaning, row.advice};
     }
-    return {"The service answered with the unknown value " + std::to_string(value) + ".", kAskLog};
+    return {"The service answered with the unknown value " + std::to_string(value) + ".", kAskLogAgain};
 }
 
 /// The service holds an adapter, and no job says why.

@@ -28,8 +28,6 @@ core::CimPath findService(core::CimOperations& operations) try {
     throw CommandError(error.status(), error.what(), error.advice());
 }
 
-constexpr const char* kAskLog = "The system log may have the details.";
-
 /// What the methods take as InstallOptions and InstallOptionsValues. The values are parallel to the codes,
 /// value i belonging to code i: the one code that has a value comes first.
 struct InstallCodes {

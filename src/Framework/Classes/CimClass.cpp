@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Framework/Classes/CimClass.h"
 
+#include <new>
+
 #include "Framework/Model/CimType.h"
 
 namespace core {
@@ -76,14 +78,14 @@ std::vector<const ServedClass*> CimClasses::getAll() const {
 
 void CimClasses::abandon() noexcept QUENX_NO_THREAD_SAFETY_ANALYSIS {
     // In a list that is never destroyed, and that leak checkers find.
-    static auto& abandoned = *new std::vector<std::unique_ptr<ServedClass>>;
+    static auto* const abandoned = new (std::nothrow) std::vector<std::unique_ptr<ServedClass>>;
     for (auto& served : m_served) {
         try {
-            abandoned.push_back(nullptr);
-            abandoned.back() = std::move(served);
-        } catch (...) {
-            static_cast<void>(served.release());
+            if (abandoned != nullptr) abandoned->emplace_back().swap(served);
+        } catch (const std::bad_alloc&) {
+            // Then it is only let go of.
         }
+        static_cast<void>(served.release());
     }
     m_served.clear();
 }

@@ -119,14 +119,15 @@ class InstanceReaper {
         if (--m_bans == 0 && m_first != nullptr) startThread();
     }
 
+    /// To be called while threads are banned.
     void drain() noexcept {
         const utils::Thread::Waiting waiting;
         std::unique_lock lock(m_mutex);
         if (!isOfThisProcess() && m_first == nullptr) return;
         while (m_first != nullptr || m_busy != 0) {
-            // Without a thread the caller does the work, since it must not go on before it is done. The
-            // thread that was there may have ended meanwhile.
-            if (m_first != nullptr && !startThread()) {
+            // No thread starts now. Without one the caller does the work, since it must not go on before it
+            // is done.
+            if (m_first != nullptr && !hasThread()) {
                 destroyQueued(lock);
             } else {
                 m_changed.wait(lock);
@@ -137,15 +138,20 @@ class InstanceReaper {
   private:
     bool isOfThisProcess() const { return m_forks == os::forkCount(); }
 
-    /// Under the lock. False when the system refuses a thread, or one is not wanted.
-    bool startThread() noexcept {
+    /// Under the lock.
+    bool hasThread() noexcept {
         if (!isOfThisProcess()) {
             // The parent's thread is not here, whatever it was doing.
             m_forks = os::forkCount();
             m_isRunning = m_isJoinable = false;
             m_busy = 0;
         }
-        if (m_isRunning) return true;
+        return m_isRunning;
+    }
+
+    /// Under the lock. False when the system refuses a thread, or one is not wanted.
+    bool startThread() noexcept {
+        if (hasThread()) return true;
         if (m_bans != 0) return false;
         forgetThread();
         const utils::SignalsBlocked blocked;

@@ -163,8 +163,7 @@ std::string hashPassword(const std::string& password) {
     if (std::ranges::any_of(password, utils::isControl)) {
         throw std::runtime_error(
             "The password holds a control character, so nothing was changed. Give it as one line of UTF-8, "
-            "with "
-            "neither NUL bytes nor carriage returns.");
+            "with neither NUL bytes nor carriage returns.");
     }
     char setting[CRYPT_GENSALT_OUTPUT_SIZE];
     if (::crypt_gensalt_rn(nullptr, 0, nullptr, 0, setting, sizeof setting) == nullptr) {

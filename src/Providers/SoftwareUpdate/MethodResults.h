@@ -92,6 +92,18 @@ bool isRefusal(const utils::Exception& exception);
 /// The code for the exception; a refusal's text goes to the error log on the way.
 int verifyJobResultOf(const utils::Exception& exception) noexcept;
 
+/// What the step returns, or the code for what it throws.
+template <class Step>
+int resultOf(Step&& step) noexcept {
+    try {
+        return step();
+    } catch (const utils::Exception& exception) {
+        return verifyJobResultOf(exception);
+    } catch (...) {
+        return VerifyJobResult::UnspecifiedError;
+    }
+}
+
 /// What tells the methods that only verify from those that install.
 struct MethodKind {
     const char* verification;      ///< "... returns: %d"

@@ -38,16 +38,12 @@ int Quenx_ConcreteJobClass::verifyOrCreateNewJob(std::string adapterName, std::s
     const utils::TimeStamp timing("Quenx_ConcreteJobClass::createNewJob");
     const core::RequestScope scope;  // a client may delete the job as soon as it is listed
     job = nullptr;
-    try {
+    return resultOf([&]() -> int {
         UpdateOrder order{std::move(adapterName), std::move(uri), installOptions, installOptionValues};
         if (create) return createJob(order, job);
         verifyImage(order).claim.releaseIfConfigured();
         return VerifyJobResult::Success;
-    } catch (const utils::Exception& exception) {
-        return verifyJobResultOf(exception);
-    } catch (...) {
-        return VerifyJobResult::UnspecifiedError;
-    }
+    });
 }
 
 int Quenx_ConcreteJobClass::createJob(UpdateOrder& order, Quenx_ConcreteJob*& job) {

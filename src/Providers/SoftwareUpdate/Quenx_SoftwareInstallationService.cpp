@@ -39,14 +39,10 @@ Quenx_ConcreteJobClass& jobRegistry() {
 
 /// A VerifyJobResult, found without claiming the adapter.
 int resultOfExamining(const UpdateOrder& order) {
-    try {
+    return resultOf([&]() -> int {
         examineImage(order);
         return VerifyJobResult::Success;
-    } catch (const utils::Exception& exception) {
-        return verifyJobResultOf(exception);
-    } catch (...) {
-        return VerifyJobResult::UnspecifiedError;
-    }
+    });
 }
 
 /// Exactly one of Target and Collection may be given. Returns what the method returns at once, if anything.

@@ -72,7 +72,8 @@ class QUENX_EXPORT UnusableFile : public std::runtime_error {
 };
 
 /// Has this process ignore the signals that mean nothing to it and would end it, in a flash too: a client or
-/// a reader that goes away, a file that may not grow, timers and user signals. For the first lines of main().
+/// a reader that goes away, a file that may not grow, timers and user signals. To be called before anything
+/// that such an end would harm.
 QUENX_EXPORT void ignoreOtherSignals() noexcept;
 
 /// True exactly when the path can be opened as a directory.
