@@ -254,41 +254,51 @@ TEST(ConfigCheckTest, LooksAtEveryFile) {
     EXPECT_FALSE(host::makeTlsFiles({certificate, key, false}));
     EXPECT_TRUE(host::makeTlsFiles({folder / "other-cert.pem", otherKey, true}));
     EXPECT_EQ(fs::status(key).permissions(), fs::perms(0600));
-    const std::tuple<int, std::string, std::string, Words> table[] = {
+    // The mistake that is named; nothing where there is none.
+    const std::tuple<std::string, std::string, std::string, Words> table[] = {
         // First: with a sanitizer the providers stay where they are loaded.
-        {2, certificate, key, {"--providers-directory", folder.path()}},
-        {2, certificate, key, {"--providers-directory", "/nonexistent"}},
-        {0, certificate, key, {}},
-        {0, folder / "none", folder / "none", {"--tls-generate"}},
-        {2, folder / "none", folder / "none", {}},
-        {2, certificate, key, {"--listen-address", "192.0.2.1"}},
-        {2, certificate, key, {"--daemon-lock-file", "/nonexistent/lock"}},
-        {2, certificate, key, {"--listen-socket", "/nonexistent/socket"}},
-        {2, certificate, key, {"--listen-socket", junk}},
-        {0, certificate, key, {"--listen-socket", folder / "socket"}},
-        {2, certificate, key, {"--auth-method", "users", "--auth-users-file", "/nonexistent"}},
-        {2, certificate, key, {"--providers-configuration", "/nonexistent"}},
-        {2, certificate, key, {"--providers-configuration", "/dev/zero"}},
-        {2, certificate, key, {"--adapters-description", "/nonexistent", "--adapters-state", "/tmp"}},
-        {2, certificate, key, {"--adapters-description", junk, "--adapters-state", "/tmp"}},
+        {"providers.directory", certificate, key, {"--providers-directory", folder.path()}},
+        {"providers.directory", certificate, key, {"--providers-directory", "/nonexistent"}},
+        {"", certificate, key, {}},
+        {"", folder / "none", folder / "none", {"--tls-generate"}},
+        {"tls.certificate is", folder / "none", folder / "none", {}},
+        {"listen.address", certificate, key, {"--listen-address", "192.0.2.1"}},
+        {"daemon.lock_file is", certificate, key, {"--daemon-lock-file", "/nonexistent/lock"}},
+        {"listen.socket is", certificate, key, {"--listen-socket", "/nonexistent/socket"}},
+        {"listen.socket", certificate, key, {"--listen-socket", junk}},
+        {"", certificate, key, {"--listen-socket", folder / "socket"}},
+        {"the users file", certificate, key, {"--auth-method", "users", "--auth-users-file", "/nonexistent"}},
+        {"providers.configuration", certificate, key, {"--providers-configuration", "/nonexistent"}},
+        {"providers.configuration", certificate, key, {"--providers-configuration", "/dev/zero"}},
+        {"adapter description",
+         certificate,
+         key,
+         {"--adapters-description", "/nonexistent", "--adapters-state", "/tmp"}},
+        {"line 1", certificate, key, {"--adapters-description", junk, "--adapters-state", "/tmp"}},
         // Where a start could not write is said, and not found out by the first update.
-        {2, certificate, key, {"--adapters-description", noAdapters, "--adapters-state", junk + "/state"}},
-        {2, certificate, otherKey, {}},
-        {2, certificate, junk, {}},
-        {2, certificate, "/dev/zero", {}},
-        {2, certificate, folder / "none", {"--tls-generate"}},
-        {2, folder / "none", key, {}},
-        {2, junk, key, {}},
-        {2, key, key, {}},
+        {"adapters.state",
+         certificate,
+         key,
+         {"--adapters-description", noAdapters, "--adapters-state", junk + "/state"}},
+        {"is not the key", certificate, otherKey, {}},
+        {"private key", certificate, junk, {}},
+        {"private key", certificate, "/dev/zero", {}},
+        {"tls.key is", certificate, folder / "none", {"--tls-generate"}},
+        {"tls.certificate is", folder / "none", key, {}},
+        {"tls.certificate", junk, key, {}},
+        {"tls.certificate", key, key, {}},
     };
     const std::string config = folder.write("config",
                                             "[listen]\nhttps_port = 0\nsocket = ''\n"
                                             "[daemon]\nlock_file = '" +
                                                 (folder / "lock") + "'\n");
-    for (const auto& [status, certificateFile, keyFile, more] : table) {
+    for (const auto& [mistake, certificateFile, keyFile, more] : table) {
         Words arguments{"--config", config, "--tls-certificate", certificateFile, "--tls-key", keyFile};
         arguments.insert(arguments.end(), more.begin(), more.end());
-        EXPECT_EQ(host::checkConfiguration(read(arguments).settings), status) << certificateFile << keyFile;
+        ::testing::internal::CaptureStderr();
+        const int status = host::checkConfiguration(read(arguments).settings);
+        EXPECT_THAT(::testing::internal::GetCapturedStderr(), HasSubstr(mistake));
+        EXPECT_EQ(status, mistake.empty() ? 0 : 2) << certificateFile << keyFile;
     }
     fs::remove(key);
     EXPECT_THROW(host::makeTlsFiles({certificate, key, true}), std::runtime_error);
