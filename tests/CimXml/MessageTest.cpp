@@ -156,6 +156,9 @@ TEST(ResponseWriterTest, WritesTextsAsClientsExpectThem) {
     result.instances.clear();
     EXPECT_THAT(written(result), HasSubstr("<IRETURNVALUE></IRETURNVALUE>"));
     EXPECT_THAT(written({}), ::testing::Not(HasSubstr("IRETURNVALUE")));
+    result.kind = cimxml::ResultKind::Qualifiers;
+    result.qualifiers = {{"Old", CimValue::of(CimType::Boolean, true), {"CLASS"}, false, false, true}};
+    EXPECT_THAT(written(result), HasSubstr("<VALUE>TRUE</VALUE></QUALIFIER.DECLARATION>"));
 }
 
 TEST(ResponseReaderTest, RefusesWhatIsNoResponse) {

@@ -16,7 +16,7 @@ using cimxml::WireError;
 
 TEST(XmlGuardTest, TellsWhatIsWellFormed) {
     for (const char* good : {"\xEF\xBB\xBF<?xml version='1.0' encoding=\"UTF-8\" standalone='yes'?>\n<a/>",
-                             "<a b='1' c=\"&lt;'\"><d >x &amp; &#x41; &#x10FFFF; ]] ></d ><![CDATA[<&]]></a>",
+                             "<a b = '1' c=\"&lt;'\"><d >x &amp; &#x41; &#x10FFFF; ]] ></d ><![CDATA[<&]]></a>",
                              "<a>gr\xC3\xBC\xE2\x82\xAC\xF0\x9F\x98\x80\t\r\n</a>\n<!-- end --><?p x?>"})
         EXPECT_NO_THROW(checkWellFormed(good)) << good;
     for (const char* bad :
