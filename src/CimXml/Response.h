@@ -81,8 +81,8 @@ struct Response {
 
 /// Reads a response message, as a client. Values and keys are typed by what the message says of them. The
 /// instance of GetInstance comes without the keys in its path, since the message has none; an empty
-/// IRETURNVALUE tells no kind. Qualifier declarations are passed over. Throws WireError for bytes that are
-/// no response. Thread-safe, no state.
+/// IRETURNVALUE tells no kind. Qualifier declarations and names of classes are passed over. Throws WireError
+/// for bytes that are no response. Thread-safe, no state.
 Response readResponse(std::string_view bytes);
 
 /// The response message, in the forms that the common clients read. Thread-safe, no state. The second lets go

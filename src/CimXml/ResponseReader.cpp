@@ -106,11 +106,8 @@ void readReturned(IntrinsicResult& result, const pugi::xml_node& element) {
         case ResultKind::Classes:
             result.classes.push_back(readClass(element));
             break;
-        case ResultKind::ClassNames:
-            result.classNames.push_back(requiredAttribute(element, "NAME"));
-            break;
         default:
-            break;  // qualifier declarations: the schema's own are known, and others are of no use here
+            break;  // qualifier declarations and names of classes: no client here asks for them
     }
 }
 
