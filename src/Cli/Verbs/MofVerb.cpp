@@ -115,8 +115,7 @@ Waiting::const_iterator nextClass(const Waiting& waiting) {
         if (refersToDone(waiting, *each->second)) return each;
         if (best == waiting.end()) best = each;
     }
-    // If a server sends two classes of one name, none may fit; the loop must end even then.
-    return best == waiting.end() ? waiting.begin() : best;
+    return best;  // there is one: chains of superclasses have an end
 }
 
 std::string mofText(const std::vector<core::ClassChain>& classes) {
@@ -124,8 +123,9 @@ std::string mofText(const std::vector<core::ClassChain>& classes) {
     for (const core::QualifierDeclaration& declaration : core::qualifierDeclarations())
         text += declarationText(declaration);
     Waiting waiting;
+    // If a server sends two classes of one name, the first counts, as it does in the chains.
     for (const core::ClassChain& chain : classes)
-        waiting[core::foldName(chain.front()->name)] = chain.front().get();
+        waiting.emplace(core::foldName(chain.front()->name), chain.front().get());
     while (!waiting.empty()) {
         const auto next = nextClass(waiting);
         text += "\n" + classText(*next->second);
