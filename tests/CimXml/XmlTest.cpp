@@ -15,9 +15,10 @@ using cimxml::checkWellFormed;
 using cimxml::WireError;
 
 TEST(XmlGuardTest, TellsWhatIsWellFormed) {
-    for (const char* good : {"\xEF\xBB\xBF<?xml version='1.0' encoding=\"UTF-8\" standalone='yes'?>\n<a/>",
-                             "<a b = '1' c=\"&lt;'\"><d >x &amp; &#x41; &#x10FFFF; ]] ></d ><![CDATA[<&]]></a>",
-                             "<a>gr\xC3\xBC\xE2\x82\xAC\xF0\x9F\x98\x80\t\r\n</a>\n<!-- end --><?p x?>"})
+    for (const char* good :
+         {"\xEF\xBB\xBF<?xml version='1.0' encoding=\"UTF-8\" standalone='yes'?>\n<a/>",
+          "<a b = '1' c=\"&lt;'\"><d >x &amp; &#x41; &#x10FFFF; ]] ></d ><![CDATA[<&]]></a>",
+          "<?xml version='1.0'?><a>gr\xC3\xBC\xE2\x82\xAC\xF0\x9F\x98\x80\t\r\n</a>\n<!-- end --><?p x?>"})
         EXPECT_NO_THROW(checkWellFormed(good)) << good;
     for (const char* bad :
          {"", "<a>", "<a></b>", "<a/><b/>", "text<a/>", "<1a/>", "<![CDATA[x]]><a/>", "<!DOCTYPE a><a/>",
