@@ -72,25 +72,28 @@ TEST(OptionRomTest, NamesWhatIsBroken) {
         mend(rom);
     };
     const std::pair<const char*, void (*)(Rom&)> table[] = {
-        {"the file is empty", [](Rom& rom) { rom.clear(); }},
-        {"ends inside the image header", [](Rom& rom) { rom.resize(0x1B); }},
-        {"signature 55 AA", [](Rom& rom) { rom[0] = 0x56; }},
-        {"lies outside the image", [](Rom& rom) { ma::writeLe16(rom, 0x18, 0xFFF0); }},
-        {"lies outside the image", [](Rom& rom) { rom.resize(0x30); }},
-        {"\"PCIR\"", [](Rom& rom) { rom[PCIR] = 'X'; }},
-        {"image length is 0", [](Rom& rom) { ma::writeLe16(rom, PCIR + 0x10, 0); }},
-        {"cut short", [](Rom& rom) { rom.resize(1023); }},
-        {"length of the PCI data structure", [](Rom& rom) { ma::writeLe16(rom, PCIR + 0x0A, 0xFFFF); }},
-        {"no end", [](Rom& rom) { ma::writeLe16(rom, PCIR + 0x08, 0x8000); }},
-        {"list of device ids lies inside", [](Rom& rom) { ma::writeLe16(rom, PCIR + 0x08, 27); }},
-        {"no end",
+        {"image 1 at 0x0: the file is empty (offset 0x0)", [](Rom& rom) { rom.clear(); }},
+        {"ends inside the image header (offset 0x0)", [](Rom& rom) { rom.resize(0x1B); }},
+        {"signature 55 AA is missing (offset 0x0)", [](Rom& rom) { rom[0] = 0x56; }},
+        {"lies outside the image (offset 0x18)", [](Rom& rom) { ma::writeLe16(rom, 0x18, 0xFFF0); }},
+        {"lies outside the image (offset 0x18)", [](Rom& rom) { rom.resize(0x30); }},
+        {"\"PCIR\" (offset 0x1c)", [](Rom& rom) { rom[PCIR] = 'X'; }},
+        {"image length is 0 (offset 0x2c)", [](Rom& rom) { ma::writeLe16(rom, PCIR + 0x10, 0); }},
+        {" 1024 bytes long, but the file has only 1023 left: it is cut short (offset 0x2c)",
+         [](Rom& rom) { rom.resize(1023); }},
+        {"length of the PCI data structure is wrong (offset 0x26)",
+         [](Rom& rom) { ma::writeLe16(rom, PCIR + 0x0A, 0xFFFF); }},
+        {"no end (offset 0x24)", [](Rom& rom) { ma::writeLe16(rom, PCIR + 0x08, 0x8000); }},
+        {"lies inside the PCI data structure (offset 0x24)",
+         [](Rom& rom) { ma::writeLe16(rom, PCIR + 0x08, 27); }},
+        {"no end (offset 0x24)",
          [](Rom& rom) {
              ma::writeLe16(rom, PCIR + 0x08, 0x300);
              std::fill(rom.begin() + 0x300, rom.end(), std::uint8_t{0xFF});
          }},
-        {"checksum is wrong", [](Rom& rom) { ++rom[0x300]; }},
-        {"EFI signature", [](Rom& rom) { rom[PCIR + 0x14] = 3; }},
-        {"before the image that has the last-image bit", notLast},
+        {"checksum is wrong: the bytes sum to 1, not 0 (offset 0x0)", [](Rom& rom) { ++rom[0x300]; }},
+        {"EFI signature (offset 0x4)", [](Rom& rom) { rom[PCIR + 0x14] = 3; }},
+        {"image that has the last-image bit: it is cut short (offset 0x400)", notLast},
         {"image 2 at 0x400: the signature 55 AA is missing (offset 0x400)",
          [](Rom& rom) {
              notLast(rom);
@@ -101,7 +104,7 @@ TEST(OptionRomTest, NamesWhatIsBroken) {
         Rom rom = test::madeRom({{PXE, 1}});
         damage(rom);
         const std::string error = ma::parseOptionRom(rom).error.value_or("none");
-        EXPECT_NE(std::string::npos, error.find(part)) << error << "\nwanted: " << part;
+        EXPECT_TRUE(error.ends_with(part)) << error << "\nwanted: " << part;
     }
 }
 
