@@ -20,21 +20,21 @@ constexpr std::size_t kLongestName = 64;
 constexpr std::uint64_t kHighestSpeed = std::numeric_limits<std::int64_t>::max();  // all that TOML has
 constexpr std::uint32_t kLongestStall = 600'000;  // ten minutes, in milliseconds
 
-constexpr std::array<std::string_view, 14> kAdapterKeys = {
-    "name", "description", "pci_address", "pci_id",    "subsystem_id", "mac",        "speed",
-    "link", "updatable",   "write_speed", "boot_type", "flash_file",   "components", "fault"};
-constexpr std::array<std::string_view, 2> kComponentKeys = {"type", "revision"};
-constexpr std::array<std::string_view, 7> kFaultKeys = {"at",   "action",       "percent", "code",
-                                                        "text", "milliseconds", "once"};
-constexpr std::array<std::string_view, 1> kTopKeys = {"adapter"};
-constexpr std::array<std::string_view, 5> kComponentTypes = {"IMG_CLP", "IMG_iSCSI", "IMG_PXE", "IMG_UEFI",
-                                                             "IMG_FCoE"};
-constexpr std::array<std::string_view, 5> kBootTypes = {"none", "pxe", "iscsi", "fcoe", "uefi"};
+constexpr auto kAdapterKeys = std::to_array<std::string_view>(
+    {"name", "description", "pci_address", "pci_id", "subsystem_id", "mac", "speed", "link", "updatable",
+     "write_speed", "boot_type", "flash_file", "components", "fault"});
+constexpr auto kComponentKeys = std::to_array<std::string_view>({"type", "revision"});
+constexpr auto kFaultKeys =
+    std::to_array<std::string_view>({"at", "action", "percent", "code", "text", "milliseconds", "once"});
+constexpr auto kTopKeys = std::to_array<std::string_view>({"adapter"});
+constexpr auto kComponentTypes =
+    std::to_array<std::string_view>({"IMG_CLP", "IMG_iSCSI", "IMG_PXE", "IMG_UEFI", "IMG_FCoE"});
+constexpr auto kBootTypes = std::to_array<std::string_view>({"none", "pxe", "iscsi", "fcoe", "uefi"});
 // In the order of Operation and of Fault::Action.
-constexpr std::array<std::string_view, 8> kOperations = {"enumerate", "pci-address", "firmware-version",
-                                                         "prepare",   "write",       "capability-word",
-                                                         "boot-type", "info"};
-constexpr std::array<std::string_view, 5> kActions = {"fail", "throw", "stall", "power-loss", "kill"};
+constexpr auto kOperations =
+    std::to_array<std::string_view>({"enumerate", "pci-address", "firmware-version", "prepare", "write",
+                                     "capability-word", "boot-type", "info"});
+constexpr auto kActions = std::to_array<std::string_view>({"fail", "throw", "stall", "power-loss", "kill"});
 
 /// Takes so many hexadecimal digits and then the separator (none when it is NUL) off the front of a text.
 template <class T>
