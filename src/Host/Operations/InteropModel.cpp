@@ -26,32 +26,28 @@ PropertyDeclaration key(const char* name) {
     return {name, CimType::String, false, true, ""};
 }
 
+core::ClassDeclaration declare(const char* name, const char* superclass,
+                               std::vector<PropertyDeclaration> properties = {}) {
+    return {name, superclass, false, std::move(properties), {}};
+}
+
 std::vector<core::ClassDeclaration> declarations() {
     const PropertyDeclaration states{"OperationalStatus", CimType::Uint16, true, false, ""};
     std::vector<core::ClassDeclaration> all{
-        {"CIM_ManagedElement", "", false, {text("Caption"), text("Description"), text("ElementName")}, {}},
-        {"CIM_ManagedSystemElement", "CIM_ManagedElement", false, {text("Name"), states}, {}},
-        {"CIM_LogicalElement", "CIM_ManagedSystemElement", false, {}, {}},
-        {"CIM_EnabledLogicalElement",
-         "CIM_LogicalElement",
-         false,
-         {property("EnabledState", CimType::Uint16)},
-         {}},
-        {"CIM_Service",
-         "CIM_EnabledLogicalElement",
-         false,
-         {key("SystemCreationClassName"), key("SystemName"), key("CreationClassName"), key("Name"),
-          property("Started", CimType::Boolean)},
-         {}},
-        {"CIM_WBEMService", "CIM_Service", false, {}, {}},
-        {kManager, "CIM_WBEMService", false, {text("Version")}, {}},
-        {kNamespace,
-         "CIM_ManagedElement",
-         false,
-         {key("SystemCreationClassName"), key("SystemName"), key("ObjectManagerCreationClassName"),
-          key("ObjectManagerName"), key("CreationClassName"), key("Name"),
-          property("ClassInfo", CimType::Uint16)},
-         {}}};
+        declare("CIM_ManagedElement", "", {text("Caption"), text("Description"), text("ElementName")}),
+        declare("CIM_ManagedSystemElement", "CIM_ManagedElement", {text("Name"), states}),
+        declare("CIM_LogicalElement", "CIM_ManagedSystemElement"),
+        declare("CIM_EnabledLogicalElement", "CIM_LogicalElement",
+                {property("EnabledState", CimType::Uint16)}),
+        declare("CIM_Service", "CIM_EnabledLogicalElement",
+                {key("SystemCreationClassName"), key("SystemName"), key("CreationClassName"), key("Name"),
+                 property("Started", CimType::Boolean)}),
+        declare("CIM_WBEMService", "CIM_Service"),
+        declare(kManager, "CIM_WBEMService", {text("Version")}),
+        declare(kNamespace, "CIM_ManagedElement",
+                {key("SystemCreationClassName"), key("SystemName"), key("ObjectManagerCreationClassName"),
+                 key("ObjectManagerName"), key("CreationClassName"), key("Name"),
+                 property("ClassInfo", CimType::Uint16)})};
     for (core::ClassDeclaration& each : all)
         core::addImpliedQualifiers(each);
     return all;
