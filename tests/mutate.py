@@ -160,6 +160,10 @@ def run(command, limit=BUILD_SECONDS, **options):
         except subprocess.TimeoutExpired:
             return "It took too long.", False
         finally:
+            if process.poll() is None:
+                # Ninja then ends its compilers, which are in groups of their own.
+                os.killpg(process.pid, signal.SIGTERM)
+                time.sleep(1)
             end(process)
 
 
