@@ -32,10 +32,9 @@ std::vector<std::filesystem::path> librariesIn(const std::string& directory) {
     return files;
 }
 
-/// The loader's words for its latest failure, without the file, which it names first when it can.
+/// The loader's words for its failure just now, without the file, which it names first when it can.
 std::string loaderReason(const std::string& file) {
-    const char* text = dlerror();
-    const std::string reason = text == nullptr ? "unknown reason" : text;
+    const std::string reason = dlerror();
     return reason.starts_with(file + ": ") ? reason.substr(file.size() + 2) : reason;
 }
 
