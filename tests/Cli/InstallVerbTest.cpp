@@ -58,6 +58,7 @@ class FakeService : public core::CimRequests {
 
     FakeService() : CimRequests("") {}
     Instances enumerateInstances(const std::string& className, const PropertyFilter&) override {
+        if (className == "Quenx_ConcreteJob") return {jobs.begin(), jobs.end()};
         if (className != "Quenx_EthernetPort") return {};
         return {{CimPath("Quenx_EthernetPort.DeviceID=\"eth0\""),
                  {{"Name", CimValue::of(CimType::String, std::string("eth0")), false, {}},
@@ -97,10 +98,11 @@ class FakeService : public core::CimRequests {
 class InstallVerbTest : public ::testing::Test {
   protected:
     /// Forgets what the last run printed, and runs it.
-    ExitStatus install() {
+    ExitStatus run(cli::Verb verb, bool isInProcess) {
         for (std::ostringstream* stream : {&m_out, &m_error, &m_lines})
             stream->str("");
-        const cli::Connection connection{.operations = m_service, .isInProcess = true, .sharesFiles = true};
+        const cli::Connection connection{
+            .operations = m_service, .isInProcess = isInProcess, .sharesFiles = true};
         cli::LinePrinter printer(m_lines, {});
         cli::ProgressDisplay progress(printer, [] { return std::chrono::steady_clock::time_point(); });
         cli::Context context{
@@ -113,8 +115,9 @@ class InstallVerbTest : public ::testing::Test {
         cli::VerbOptions options;
         options.update.target = "eth0";
         options.update.image = m_file;
-        return cli::install(context, options);
+        return verb(context, options);
     }
+    ExitStatus install() { return run(cli::install, true); }
 
     test::TempFolder m_folder;
     std::string m_file = m_folder.write(
@@ -234,6 +237,17 @@ TEST_F(InstallVerbTest, SaysAfterAFailureOnlyWhatWasReadBack) {
     EXPECT_EQ(
         m_out.str(),
         "eth0 was updated.\nIts versions cannot be read now; \"quenxctl adapters\" shows them later.\n");
+}
+
+TEST_F(InstallVerbTest, ListsWhoseJobsTheyAreWhereTheServiceSays) {
+    m_service->jobs.pop_back();
+    m_service->jobs.back().properties.push_back(
+        {"Owner", CimValue::of(CimType::String, std::string("ann")), false, {}});
+    EXPECT_EQ(run(cli::showJobs, false), ExitStatus::Done);
+    EXPECT_EQ(m_out.str(),
+              "JOB  ADAPTER  STATE     PERCENT  START  USER  ERROR\n"
+              "     -        Starting  0        -      -     \n"
+              "     -        Running   40       -      ann   \n");
 }
 
 }  // namespace
