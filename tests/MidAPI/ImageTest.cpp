@@ -26,7 +26,9 @@ void mend(Rom& image) {
 }
 
 TEST(OptionRomTest, TellsTypesByCodeProductAndClpEntry) {
-    EXPECT_EQ("IMG_CLP 7, IMG_PXE 7", test::describeRom(test::madeRom({{CLP, 7}})));
+    EXPECT_EQ("IMG_CLP 777, IMG_PXE 777",
+              test::describeRom(test::withRevision(test::madeRom({{CLP, 7}}), 777)));
+    EXPECT_EQ(ma::makeRomImage({.type = PXE, .furtherDeviceIds = {}, .length = 1}).size(), 512U);
     EXPECT_EQ("IMG_iSCSI 2, IMG_UEFI 3, IMG_FCoE 1",
               test::describeRom(test::madeRom({{FCoE, 1}, {iSCSI, 2}, {UEFI, 3}})));
 }

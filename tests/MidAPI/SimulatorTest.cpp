@@ -51,8 +51,9 @@ TEST(SimulatorTest, WritesOnlyImagesForTheCard) {
     broken.back() ^= 1;
     for (const Rom& bad : {broken, Rom(), test::madeRom({{PXE, 9}}, 0x10ec, 0x8139)})
         EXPECT_EQ(ma::WriteError::BadImage, test::writeImage("eth0", bad).code);
-    EXPECT_EQ(ma::WriteError::NotUpdatable,
-              test::writeImage("eth3", test::madeRom({{PXE, 9}}, 0x1022, 0x2000)).code);
+    const test::WriteResult refused = test::writeImage("eth3", test::madeRom({{PXE, 9}}, 0x1022, 0x2000));
+    EXPECT_EQ(refused.code, ma::WriteError::NotUpdatable);
+    EXPECT_EQ(refused.text, "this adapter cannot be updated");
     EXPECT_EQ("IMG_PXE 1, IMG_UEFI 0", test::componentsOf("eth0"));
 
     // Nor is what makes the flash's chain longer than a chain may be.
