@@ -42,7 +42,7 @@ TEST(SettingsTest, NameTheMistakesInTheFile) {
         {"[listen]\nhttp = 1\n", "must be true or false"},
         {"[auth]\nreaders = 'a'\n", "must be a list"},
         {"[auth]\nreaders = [1]\n", "must be a text"},
-        {"\n[lisen]\n", ":2: there is no section [lisen]"},
+        {"\n[list]\n", ":2: there is no section [list]"},
         {"[listen]\nunknown = 1\n", ":2: there is no setting listen.unknown"},
         {"https = true\n", "must be in a [section]"},
         {"[listen\n", ":1: "},

@@ -163,8 +163,8 @@ TEST_F(ConnectionRoomTest, KnowsTheNetworksOfOthersHoweverManyOneUserHas) {
     }
     for (const char* stranger : {"u", "v", "w", "x", "y", "z"})
         EXPECT_TRUE(admit(stranger));
-    EXPECT_TRUE(admit("K") && admit("K"));
-    EXPECT_EQ(ended(), "") << "a quarter is kept for K";
+    EXPECT_TRUE(admit("K") && admit("n1000"));
+    EXPECT_EQ(ended(), "") << "a quarter is kept for K, and for where the other was lately";
 }
 
 TEST(WantedPropertiesTest, FindAsFastAmongThousandsOfNames) {
