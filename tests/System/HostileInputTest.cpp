@@ -176,6 +176,7 @@ TEST_F(HostileInputTest, RefusesARequestByItsFault) {
                                                   length + "\r\nAuthorization: Basic eDp5"};
     const std::tuple<std::string, int, const char*, std::vector<std::string>> table[] = {
         {"</CIM>", 400, "CIMError: request-not-well-formed", {"</CIX>"}},
+        {"DTDVERSION=\"2.0", 400, "CIMError: request-not-well-formed", {"DTDVERSION=\"2.\x01"}},
         {"Authorization: Basic ", 401, "WWW-Authenticate: Basic realm=", {"X: "}},
         {"POST", 405, "Allow: POST", {"GET"}},
         {"POST", 501, "", {"M-POST"}},
