@@ -207,18 +207,20 @@ TEST(RemoteConnectionTest, ReadsAListWholeFromAServerWithoutPieces) {
     int requests = 0;
     const ToldServer server([&](int client, const std::string& request) {
         const std::string id = std::to_string(++requests);
-        const bool isWhole = request.find("\"EnumerateInstanceNames\"") != std::string::npos;
-        ToldServer::sendResponse(
-            client,
-            message(id, isWhole ? "<IMETHODRESPONSE NAME='EnumerateInstanceNames'><IRETURNVALUE>"
-                                  "<INSTANCENAME CLASSNAME='Y'/></IRETURNVALUE></IMETHODRESPONSE>"
-                                : "<IMETHODRESPONSE NAME='OpenEnumerateInstancePaths'><ERROR CODE='7'/>"
-                                  "</IMETHODRESPONSE>"));
+        const auto answers = [&](const std::string& name, const std::string& content) {
+            if (request.find('"' + name + '"') == std::string::npos) return;
+            ToldServer::sendResponse(client, message(id, "<IMETHODRESPONSE NAME='" + name + "'>" + content +
+                                                             "</IMETHODRESPONSE>"));
+        };
+        answers("OpenEnumerateInstancePaths", "<ERROR CODE='7'/>");
+        answers("EnumerateInstanceNames", "<IRETURNVALUE><INSTANCENAME CLASSNAME='Y'/></IRETURNVALUE>");
+        answers("EnumerateInstances", "<IRETURNVALUE></IRETURNVALUE>");
     });
     const cli::Connection connection = server.connect();
     EXPECT_EQ(connection.operations->enumerateInstanceNames("Y").size(), 1U);
     EXPECT_EQ(connection.operations->enumerateInstanceNames("Y").size(), 1U);
-    EXPECT_EQ(requests, 3);  // it does not ask again
+    EXPECT_TRUE(connection.operations->enumerateInstances("Y").empty());
+    EXPECT_EQ(requests, 4);  // it does not ask again
 }
 
 }  // namespace

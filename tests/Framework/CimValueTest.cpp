@@ -93,6 +93,7 @@ TEST(CimPathTest, ComparesNamesWithoutCaseAndValuesByType) {
         {"Thing.No=5", "Thing.No=\"5\"", false},
         {"Thing.No=5", "Thing.No=0x5", true},
         {"Thing.No=1.5e3", "Thing.No=1500.0", true},
+        {"Thing.No=1.5", "Thing.No=1.25", false},
         {"Thing.No=5", "Thing.No=5,More=1", false},
         {"Thing.Name=\"a\"", "root/x:Thing.Name=\"a\"", true},
         {"root/y:Thing.Name=\"a\"", "root/x:Thing.Name=\"a\"", false},
