@@ -4,6 +4,7 @@
 #include <algorithm>
 
 #include "Framework/Requests/Audit.h"
+#include "Host/Repetition.h"
 #include "Providers/Schema/ValueMaps.h"
 
 namespace host {
@@ -54,20 +55,9 @@ JobRetention::JobRetention(const JobSettings& settings, std::shared_ptr<core::Ci
     const auto pause = settings.keepFor.count() == 0
                            ? kLongest
                            : std::clamp(settings.keepFor / 10, std::chrono::seconds(1), kLongest);
-    m_thread = std::jthread([this, pause](const std::stop_token& stop) { run(stop, pause); });
-}
-
-void JobRetention::run(const std::stop_token& stop, std::chrono::seconds pause) {
-    std::mutex mutex;
-    std::condition_variable_any stopped;  // nobody calls it: only the time or the stop ends a wait
-    std::unique_lock lock(mutex);
-    while (!stopped.wait_for(lock, stop, pause, [&] { return stop.stop_requested(); })) {
-        try {
-            sweep();
-        } catch (const std::exception&) {
-            // No provider here serves jobs, or there is no memory: the next look may do better.
-        }
-    }
+    // A look fails while no provider here serves jobs.
+    m_thread = std::jthread(
+        [this, pause](const std::stop_token& stop) { repeat(stop, pause, [this] { sweep(); }); });
 }
 
 void JobRetention::sweep() {

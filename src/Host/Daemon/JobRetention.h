@@ -44,7 +44,6 @@ class JobRetention {
     JobRetention& operator=(const JobRetention&) = delete;
 
   private:
-    void run(const std::stop_token& stop, std::chrono::seconds pause);
     void sweep();
 
     EndedJobs m_jobs;

@@ -1,10 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Host/Operations/AuditTrail.h"
 
-#include <condition_variable>
-#include <mutex>
 #include <new>
 #include <system_error>
+
+#include "Host/Repetition.h"
 
 namespace host {
 
@@ -43,22 +43,10 @@ void AuditTrail::refused(const core::AuditEvent& event, const std::vector<core::
 void AuditTrail::startWriter() {
     if (m_writer.joinable()) return;
     try {
-        m_writer = std::jthread([this](const std::stop_token& stop) { run(stop); });
+        m_writer = std::jthread(
+            [this](const std::stop_token& stop) { repeat(stop, m_minute, [this] { writeNumbers(); }); });
     } catch (const std::system_error&) {
         // The next call writes the number, or starts the thread.
-    }
-}
-
-void AuditTrail::run(const std::stop_token& stop) {
-    std::mutex mutex;
-    std::condition_variable_any stopped;  // nobody calls it: only the time or the stop ends a wait
-    std::unique_lock lock(mutex);
-    while (!stopped.wait_for(lock, stop, m_minute, [&] { return stop.stop_requested(); })) {
-        try {
-            writeNumbers();
-        } catch (const std::bad_alloc&) {
-            // A minute later there may be memory.
-        }
     }
 }
 

@@ -42,7 +42,6 @@ class AuditTrail {
     };
 
     void startWriter() QUENX_REQUIRES(m_mutex);
-    void run(const std::stop_token& stop);
 
     const Clock::duration m_minute;
     utils::Mutex m_mutex;
