@@ -30,7 +30,7 @@ std::string startText(const JobView& job) {
     const auto seconds = static_cast<std::time_t>(job.start->getSeconds());
     std::tm local{};
     std::array<char, sizeof "9999-12-31 23:59:59"> text{};
-    localtime_r(&seconds, &local);  // fails beyond the years that a datetime can have
+    if (localtime_r(&seconds, &local) == nullptr) return "-";
     return {text.data(), std::strftime(text.data(), text.size(), "%Y-%m-%d %H:%M:%S", &local)};
 }
 

@@ -115,7 +115,8 @@ Waiting::const_iterator nextClass(const Waiting& waiting) {
         if (refersToDone(waiting, *each->second)) return each;
         if (best == waiting.end()) best = each;
     }
-    return best;  // there is one: chains of superclasses have an end
+    // If a server answers each time otherwise, none may fit; the loop must end even then.
+    return best == waiting.end() ? waiting.begin() : best;
 }
 
 std::string mofText(const std::vector<core::ClassChain>& classes) {

@@ -117,6 +117,7 @@ HttpServer::~HttpServer() {
     for (MHD_Daemon* library : m_libraries) {
         if (library != nullptr) ::MHD_stop_daemon(library);
     }
+    currentCertificate.store(nullptr);
 }
 
 void HttpServer::setCertificate(std::shared_ptr<const ServerCertificate> certificate) {
