@@ -40,7 +40,7 @@ fi
 proxy=http://127.0.0.1:9
 "${as_user[@]}" env HOME="$place/home" JOBS="$jobs" \
     http_proxy="$proxy" https_proxy="$proxy" HTTPS_PROXY="$proxy" ALL_PROXY="$proxy" \
-    QUENX_ADAPTERS=/nonexistent/adapters.toml QUENX_ADAPTER_STATE=/nonexistent/state \
+    QUENX_BACKEND=nonexistent QUENX_ADAPTERS=/nonexistent/adapters.toml QUENX_ADAPTER_STATE=/nonexistent/state \
     QUENXCTL_USER=somebody QUENXCTL_PASSWORD=something TARVEL_SMASHv2_LOG_LEVEL=2 \
     LC_ALL=POSIX TZ=Asia/Kathmandu DESTDIR=/nonexistent CDPATH=/usr NO_COLOR=1 TERM=dumb \
     bash -euo pipefail -c '

@@ -26,7 +26,8 @@ constexpr const char* kFooter =
     "  6  interrupted: before the update began, or while a server goes on with it; the message says which\n";
 
 /// An option, or without dashes an argument, that takes one value.
-CLI::Option* addValue(CLI::App& app, const char* name, std::string& value, const char* type,
+template <class Value>
+CLI::Option* addValue(CLI::App& app, const char* name, Value& value, const char* type,
                       const char* description) {
     return app.add_option(name, value, description)->type_name(type);
 }
@@ -62,17 +63,21 @@ void addCommonOptions(CLI::App& app, Arguments& arguments) {
     CLI::Option* config =
         addValue(app, "--config", providers.configFile, "FILE",
                  "Configuration file of the providers (default: /etc/quenx-cimprovider.conf)");
-    CLI::Option* adapters = addValue(app, "--adapters", providers.adapterDescription, "FILE",
+    CLI::Option* backend =
+        addValue(app, "--backend", providers.adapters.backend, "NAME",
+                 "Which adapters: simulator, or auto for those that there are (default: QUENX_BACKEND, else "
+                 "auto)");
+    CLI::Option* adapters = addValue(app, "--adapters", providers.adapters.description, "FILE",
                                      "Description of simulated adapters (default: QUENX_ADAPTERS, else "
                                      "/etc/quenx-adapters.toml)");
-    addValue(app, "--state", providers.stateDirectory, "DIR",
+    addValue(app, "--state", providers.adapters.state, "DIR",
              "Where the simulated adapters of --adapters keep their flash (default: QUENX_ADAPTER_STATE, "
              "else beside FILE, with the extension .state)")
         ->needs(adapters);
     CLI::Option* directory =
         addValue(app, "--providers", providers.directory, "DIR",
                  "Directory of the provider libraries (default: those installed with this program)");
-    addServerOptions(app, arguments.server, {config, adapters, directory});
+    addServerOptions(app, arguments.server, {config, backend, adapters, directory});
 }
 
 std::vector<std::string> typesOf(std::string text) {
@@ -275,7 +280,7 @@ void requireOneImage(const CLI::App& app, const Arguments& arguments) {
 void chooseServer(Arguments& arguments) {
     const ProviderSettings& own = arguments.providers;
     const bool namesProviders =
-        !own.configFile.empty() || !own.adapterDescription.empty() || !own.directory.empty();
+        !own.configFile.empty() || own.adapters.backend || own.adapters.description || !own.directory.empty();
     const bool needsServer = arguments.verb == showJobs || arguments.verb == deleteJob;
     if (arguments.server.url || namesProviders || !needsServer) return;
     if (::access(localSocket().c_str(), W_OK) == 0) arguments.server.url.emplace("unix:");

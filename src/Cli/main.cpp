@@ -55,6 +55,14 @@ class NotedInterruptions {
     NotedInterruptions& operator=(const NotedInterruptions&) = delete;
 };
 
+/// Where the adapters cannot be had for what a variable says, their error begins with its name.
+std::string adviceForVariable(std::string_view error) {
+    const std::string_view name = error.substr(0, error.find(':'));
+    if (name == "QUENX_BACKEND") return "Correct QUENX_BACKEND.";
+    return name.starts_with("QUENX_") ? "Correct " + std::string(name) + " or the file that it names."
+                                      : kAskLog;
+}
+
 std::string adviceFor(const core::CimError& error) {
     switch (error.status()) {
         case core::CimStatus::InvalidClass:
@@ -69,10 +77,7 @@ std::string adviceFor(const core::CimError& error) {
         case core::CimStatus::ServerIsShuttingDown:
             return "Try again after its restart.";
         default:
-            // The adapters then say what is wrong with their description.
-            return std::string_view(error.what()).starts_with("QUENX_ADAPTERS")
-                       ? "Correct QUENX_ADAPTERS or the file that it names."
-                       : kAskLog;
+            return adviceForVariable(error.what());
     }
 }
 

@@ -3,6 +3,7 @@
 
 #include <array>
 #include <cstdint>
+#include <optional>
 #include <string>
 #include <vector>
 
@@ -64,9 +65,10 @@ struct PciIds {
 /// one that the driver does not tell is empty.
 struct NamedVersion {
     std::string name;
-    std::string fixed = {};    ///< of the board itself: never changes
-    std::string running = {};  ///< in force now
-    std::string stored = {};   ///< in the flash, in force after the reset that ResetNeeded names
+    std::string fixed = {};         ///< of the board itself: never changes
+    std::string running = {};       ///< in force now
+    std::string stored = {};        ///< in the flash, in force after the reset that ResetNeeded names
+    utils::FirmwareType type = {};  ///< the image type that it is the version of, if there is one
 
     /// What was written waits for a reset.
     bool isPending() const { return !running.empty() && !stored.empty() && running != stored; }
@@ -82,6 +84,9 @@ enum class ResetNeeded {
     PowerCycle,  ///< the machine has to be without power for a moment
     Unknown,     ///< the adapter does not tell
 };
+
+/// AdapterInfo::backend of adapters that are files, not hardware.
+inline constexpr const char* kSimulatorBackend = "simulator";
 
 /// What is known of an adapter port beside its firmware update. What a backend cannot tell stays as it is
 /// here.
@@ -99,6 +104,13 @@ struct AdapterInfo {
     std::vector<NamedVersion> versions = {};  ///< in the driver's order, each name once
     ResetNeeded resetNeeded = ResetNeeded::None;
     std::vector<std::string> interfaces = {};  ///< the network interfaces that run over the port
+};
+
+/// Which adapters are wanted. What is left open here, the environment may say; see ma::selectBackend().
+struct BackendChoice {
+    std::optional<std::string> backend = {};      ///< a backend's name, or "auto"
+    std::optional<std::string> description = {};  ///< the file that describes simulated adapters
+    std::optional<std::string> state = {};        ///< the folder in which those keep their flash
 };
 
 /// What an operation throws that has no other way to report a failure. The text is a whole sentence for

@@ -38,6 +38,7 @@ class QUENX_EXPORT Backend {
     virtual std::uint16_t getFlashImageUpdateProgress(const std::string& adapter) = 0;
     virtual bool setBootType(const std::string& adapter, BootType type) = 0;
     virtual AdapterInfo getAdapterInfo(const std::string& adapter) = 0;
+    virtual std::string describeSearch();
 };
 
 }  // namespace ma

@@ -1,43 +1,12 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "MidAPI/ma.h"
 
-#include <unistd.h>
-
-#include <cstdlib>
 #include <mutex>
 
-#include "MidAPI/Backend.h"
-#include "MidAPI/Simulator/Simulator.h"
+#include "MidAPI/Backends.h"
 
 namespace ma {
 namespace {
-
-constexpr const char* kDescriptionVariable = "QUENX_ADAPTERS";
-constexpr const char* kStateVariable = "QUENX_ADAPTER_STATE";
-constexpr const char* kDefaultDescription = "/etc/quenx-adapters.toml";
-constexpr const char* kDefaultState = "/var/lib/quenx/adapters";
-
-std::string environmentOr(const char* variable, const char* otherwise) {
-    const char* value = std::getenv(variable);
-    return value != nullptr && *value != '\0' ? value : otherwise;
-}
-
-/// Whoever reads of a mistake in the file has not necessarily named it.
-std::shared_ptr<Backend> makeNamedBackend(const std::string& description, const std::string& state) try {
-    return std::make_shared<Simulator>(description, state);
-} catch (const AdapterError& error) {
-    throw AdapterError(kDescriptionVariable + std::string(": ") + error.what());
-}
-
-std::shared_ptr<Backend> makeDefaultBackend() {
-    const std::string description = environmentOr(kDescriptionVariable, "");
-    const std::string state = environmentOr(kStateVariable, kDefaultState);
-    if (!description.empty()) return makeNamedBackend(description, state);
-    // A machine without simulated adapters has no description, and no adapters; that is not a mistake.
-    if (::access(kDefaultDescription, F_OK) == 0)
-        return std::make_shared<Simulator>(kDefaultDescription, state);
-    return std::make_shared<Simulator>(std::vector<AdapterDescription>{}, state);
-}
 
 /// The backend in use. A failure to make one is not remembered: the next call reads the corrected
 /// description.
@@ -46,7 +15,7 @@ class Selection {
     // A shared pointer, so that a call that has begun keeps its backend while another is put in place.
     std::shared_ptr<Backend> current() {
         const std::lock_guard lock(m_mutex);
-        if (!m_backend) m_backend = makeDefaultBackend();
+        if (!m_backend) m_backend = makeBackend({});
         return m_backend;
     }
 
@@ -75,6 +44,10 @@ AdapterError::AdapterError(const std::string& text) : utils::Exception("%s", tex
 AdapterError::~AdapterError() = default;
 
 Backend::~Backend() = default;
+
+std::string Backend::describeSearch() {
+    return {};
+}
 
 utils::StringArray enumerateAdapters() {
     return backend()->enumerateAdapters();
@@ -120,8 +93,12 @@ AdapterInfo getAdapterInfo(std::string adapter) {
     return backend()->getAdapterInfo(adapter);
 }
 
-void configureSimulator(const std::string& descriptionFile, const std::string& stateDirectory) {
-    selection.exchange(std::make_shared<Simulator>(descriptionFile, stateDirectory));
+void selectBackend(const BackendChoice& choice) {
+    selection.exchange(makeBackend(choice));
+}
+
+std::string describeSearch() {
+    return backend()->describeSearch();
 }
 
 std::shared_ptr<Backend> setBackend(std::shared_ptr<Backend> backend) {

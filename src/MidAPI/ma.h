@@ -73,16 +73,25 @@ QUENX_EXPORT bool setBootType(std::string adapter, BootType type);
 /// Everything else that is known of a port. Throws AdapterError for an unknown name or an unreadable adapter.
 QUENX_EXPORT AdapterInfo getAdapterInfo(std::string adapter);
 
-/// Selects simulated adapters: for embedders and tools that have their own idea of where the files are.
-/// Throws AdapterError, naming file, line and what would be right, when the description has a mistake; the
-/// backend in use then stays. Without this call the first operation reads the file named by the environment
-/// variable QUENX_ADAPTERS, or else /etc/quenx-adapters.toml; the state directory is QUENX_ADAPTER_STATE, or
-/// else /var/lib/quenx/adapters. Where there is neither a variable nor that file, there are no adapters.
-QUENX_EXPORT void configureSimulator(const std::string& descriptionFile, const std::string& stateDirectory);
+/// Selects the backend: for programs that have options or settings for it. Throws AdapterError, which names
+/// what is wrong (in a description also the line) and what would be right; the backend in use then stays.
+/// Without this call the first operation selects one, as if nothing were said.
+///
+/// A backend or a description that is said counts; where neither is, the variables QUENX_BACKEND and
+/// QUENX_ADAPTERS do, and an empty one is an error. Without a name, or with "auto", it is
+///   1. the simulator, where a description is named; one that is missing or wrong is an error
+///   2. the backend whose adapters the machine has
+///   3. the simulator, where /etc/quenx-adapters.toml is installed
+///   4. none of the machine's adapters: the list is empty
+/// The simulated adapters keep their flash in QUENX_ADAPTER_STATE, or else in /var/lib/quenx/adapters.
+QUENX_EXPORT void selectBackend(const BackendChoice& choice);
+
+/// What the backend in use looked for and what it found: sentences for people. Empty when it does not tell.
+QUENX_EXPORT std::string describeSearch();
 
 /// Replaces the backend (for tests, and for embedders that bring their own); null goes back to the one that
-/// the environment names. Operations that have begun end on the backend on which they began. Returns the
-/// previous one, null when none was chosen yet.
+/// the environment and the machine lead to. Operations that have begun end on the backend on which they
+/// began. Returns the previous one, null when none was chosen yet.
 QUENX_EXPORT std::shared_ptr<Backend> setBackend(std::shared_ptr<Backend> backend);
 
 }  // namespace ma

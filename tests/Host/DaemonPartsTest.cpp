@@ -40,6 +40,7 @@ TEST(SettingsTest, NameTheMistakesInTheFile) {
         {"[listen]\nhttps_port = -1\n", ":2: "},
         {"[listen]\nhttps_port = '1'\n", "must be a whole number"},
         {"[listen]\nhttp = 1\n", "must be true or false"},
+        {"[adapters]\ndescription = ''\n", "must be a text of at least one character"},
         {"[auth]\nreaders = 'a'\n", "must be a list"},
         {"[auth]\nreaders = [1]\n", "must be a text"},
         {"\n[list]\n", ":2: there is no section [list]"},
@@ -70,6 +71,7 @@ TEST(SettingsTest, AreAllInTheFileThatIsShipped) {
     host::readSettingsFile(folder.write("shipped", content), read);
     Settings defaults;
     defaults.providers = "/usr/lib/quenx";
+    defaults.backend = "auto";
     defaults.adapters = "/etc/quenx-adapters.toml";
     defaults.adapterState = "/var/lib/quenx/adapters";
     defaults.jobs = {1000, std::chrono::hours(24)};  // the one section that is not commented out

@@ -5,7 +5,6 @@
 #include <unistd.h>
 
 #include <algorithm>
-#include <cstdlib>
 #include <set>
 #include <thread>
 
@@ -147,48 +146,6 @@ TEST(SimulatorTest, MovesProgressOnlyForward) {
     EXPECT_FALSE(test::writeImage("eth0", prepared.image).done);
     EXPECT_NEAR(54, ma::getFlashImageUpdateProgress("eth0"), 5);
     EXPECT_TRUE(test::writeImage("eth0", prepared.image).done);
-}
-
-TEST(BackendTest, IsChosenByCallThenEnvironment) {
-    const test::SimulatedAdapters adapters;
-    ::setenv("QUENX_ADAPTERS", adapters.descriptionFile().c_str(), 1);
-    ::setenv("QUENX_ADAPTER_STATE", adapters.stateDirectory().c_str(), 1);
-    const std::shared_ptr<ma::Backend> mine = ma::setBackend(nullptr);
-    EXPECT_EQ(&*adapters, mine.get());
-    EXPECT_TRUE(install("eth0", test::madeRom({{PXE, 8}})).done);
-    EXPECT_EQ("IMG_PXE 8, IMG_UEFI 0", test::describeRom(adapters->flashContent("eth0")))
-        << "the state is shared";
-
-    EXPECT_THROW(ma::configureSimulator(adapters.folder() / "none.toml", "x"), ma::AdapterError);
-    EXPECT_EQ(5U, ma::enumerateAdapters().size()) << "the old one stays";
-    ma::configureSimulator(adapters.folder().write("empty.toml", ""), adapters.stateDirectory());
-    EXPECT_EQ(0U, ma::enumerateAdapters().size());
-    // A mistake is told at each call until it is mended.
-    ::setenv("QUENX_ADAPTERS", (adapters.folder() / "late.toml").c_str(), 1);
-    ma::setBackend(nullptr);
-    EXPECT_THROW(ma::enumerateAdapters(), ma::AdapterError);
-    adapters.folder().write("late.toml", test::kTestAdapters);
-    EXPECT_EQ(5U, ma::enumerateAdapters().size());
-    ::unsetenv("QUENX_ADAPTERS");
-    ::unsetenv("QUENX_ADAPTER_STATE");
-    ma::setBackend(mine);
-}
-
-TEST(BackendTest, AnswersUntilTheProcessHasEnded) {
-    // As a provider that is still loaded then: its destructor waits for the flash that runs.
-    const auto provider = [] {
-        if (ma::enumerateAdapters().size() != 5 || !install("eth0", test::madeRom({{PXE, 9}})).done)
-            ::_exit(1);
-    };
-    const test::TempFolder folder;
-    const std::string description = folder.write("adapters.toml", test::kTestAdapters);
-    EXPECT_EXIT(
-        {
-            std::atexit(provider);
-            ma::configureSimulator(description, folder / "state");
-            std::exit(0);
-        },
-        testing::ExitedWithCode(0), "");
 }
 
 }  // namespace

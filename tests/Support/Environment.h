@@ -7,15 +7,17 @@
 #include <map>
 #include <string>
 
+#include "MidAPI/AdapterTypes.h"
 #include "Support/TempFolder.h"
 #include "Utils/Os/Linux/SMASHv2Config.h"
 
 namespace test {
 
 /// The environment of a test program, and so of each program that it starts. Neither the caller's variables
-/// and file mode mask nor the configuration of the machine change what the tests see: there are no adapters,
-/// the providers' settings are the defaults, and the home is a folder of the tests' own. Only the variables
-/// that direct the instruments (sanitizers, coverage) and the place of temporary files are kept.
+/// and file mode mask nor the configuration of the machine change what the tests see: adapters are simulated
+/// ones, of which there are none, the providers' settings are the defaults, and the home is a folder of the
+/// tests' own. Only the variables that direct the instruments (sanitizers, coverage) and the place of
+/// temporary files are kept.
 class ChosenEnvironment {
   public:
     ChosenEnvironment() {
@@ -24,6 +26,7 @@ class ChosenEnvironment {
             {"PATH", "/usr/local/sbin:/usr/local/bin:/usr/sbin:/usr/bin:/sbin:/bin"},
             {"HOME", m_home.path()},
             {"LC_ALL", "C.UTF-8"},
+            {"QUENX_BACKEND", ma::kSimulatorBackend},
             {"QUENX_ADAPTERS", m_home.write("adapters.toml", "")},
             {"QUENXCTL_SOCKET", m_home / "socket"}};
         for (const char* kept : {"TMPDIR", "ASAN_OPTIONS", "LSAN_OPTIONS", "TSAN_OPTIONS", "UBSAN_OPTIONS",

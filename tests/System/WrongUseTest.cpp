@@ -103,6 +103,8 @@ TEST_F(WrongUseTest, SaysWhatIsWrongWithACommandLineAndWhatToDo) {
         {"adapters --json=maybe", 2, "--json takes no value."},
         {"--jsno", 2, "There is no option \"--jsno\".\nDid you mean --json? "},
         {"adapters --user a", 2, "--user requires --server"},
+        {"adapters --backend simulation", 2, "there is no backend \"simulation\"; it must be "},
+        {"adapters --state=", 2, "--state needs a value."},
         {"adapters --server https://host", 2, " cannot be used with "},
         {"isntall --traget eth0", 2, "There is no verb \"isntall\".\nDid you mean install? "},
         {"help jbos", 2, "There is no verb \"jbos\".\nDid you mean jobs? "},

@@ -8,6 +8,7 @@
 
 #include "Cli/Display/Messages.h"
 #include "Framework/Requests/CimOperations.h"
+#include "MidAPI/AdapterTypes.h"
 
 namespace cli {
 
@@ -28,10 +29,9 @@ struct Connection {
 
 /// The providers to load; an empty text leaves the choice to the system.
 struct ProviderSettings {
-    std::string configFile;          ///< the providers' configuration file
-    std::string adapterDescription;  ///< description of simulated adapters
-    std::string stateDirectory;      ///< where those keep their flash; only with a description
-    std::string directory;           ///< where the provider libraries are
+    std::string configFile;      ///< the providers' configuration file
+    ma::BackendChoice adapters;  ///< a state directory only with a description
+    std::string directory;       ///< where the provider libraries are
 };
 
 /// Loads the providers into this process. Throws CommandError, naming the file, when one cannot be

@@ -4,6 +4,7 @@
 #include <cerrno>
 #include <cstdlib>
 #include <filesystem>
+#include <optional>
 #include <system_error>
 
 #include "Cli/Connection/Connection.h"
@@ -29,25 +30,34 @@ void requireReadable(const std::string& file, const std::string& what) {
     throw CommandError(ExitStatus::WrongUse, why.message, why.advice);
 }
 
-/// Where the simulated adapters of a description keep their flash unless told otherwise: the directory that
-/// QUENX_ADAPTER_STATE names, else one beside the description ("adapters.toml" has "adapters.state").
-std::string defaultStateDirectory(const std::string& adapterDescription) {
-    const char* chosen = std::getenv("QUENX_ADAPTER_STATE");
-    if (chosen != nullptr && *chosen != '\0') return chosen;
-    return std::filesystem::absolute(adapterDescription).replace_extension(".state").string();
+/// Beside the description, unless the user has a directory for that: "adapters.toml" has "adapters.state".
+std::optional<std::string> stateDirectory(const ma::BackendChoice& adapters) {
+    if (adapters.state || std::getenv("QUENX_ADAPTER_STATE") != nullptr) return adapters.state;
+    return std::filesystem::absolute(*adapters.description).replace_extension(".state").string();
 }
 
-void selectAdapters(const ProviderSettings& settings) {
-    if (settings.adapterDescription.empty()) return;
-    requireReadable(settings.adapterDescription, "adapter description");
-    const std::string state = settings.stateDirectory.empty()
-                                  ? defaultStateDirectory(settings.adapterDescription)
-                                  : settings.stateDirectory;
+void requireValue(const char* option, const std::optional<std::string>& value) {
+    if (value && value->empty())
+        throw CommandError(ExitStatus::WrongUse, std::string(option) + " has an empty value.",
+                           "Give it one, or leave it out.");
+}
+
+void selectAdapters(ma::BackendChoice adapters) {
+    // Whatever is wrong with the variables is told when the adapters are asked for.
+    if (!adapters.backend && !adapters.description) return;
+    requireValue("--backend", adapters.backend);
+    requireValue("--adapters", adapters.description);
+    requireValue("--state", adapters.state);
+    if (adapters.description) {
+        requireReadable(*adapters.description, "adapter description");
+        adapters.state = stateDirectory(adapters);
+    }
     try {
-        ma::configureSimulator(settings.adapterDescription, state);
+        ma::selectBackend(adapters);
     } catch (const std::exception& error) {
         throw CommandError(ExitStatus::WrongUse, error.what(),
-                           "Correct the adapter description and try again.");
+                           adapters.backend ? "Correct --backend, or what it is to use."
+                                            : "Correct the adapter description and try again.");
     }
 }
 
@@ -80,7 +90,7 @@ Connection openProviders(const ProviderSettings& settings) {
     if (!settings.configFile.empty()) requireReadable(settings.configFile, "configuration file");
     const auto session = std::make_shared<core::ProviderSession>(settings.configFile);
     // The adapters first: providers may ask for them as soon as they are loaded.
-    selectAdapters(settings);
+    selectAdapters(settings.adapters);
     loadProviders(session->libraries(), settings.directory);
     // The operations share ownership with the session, so the libraries stay loaded while they can be called.
     return {.operations = {session, session->operations().get()}, .isInProcess = true, .sharesFiles = true};

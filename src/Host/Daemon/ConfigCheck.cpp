@@ -13,7 +13,6 @@
 #include "Host/Daemon/Daemon.h"
 #include "Host/Server/LocalSocket.h"
 #include "Host/Server/ServerCertificate.h"
-#include "MidAPI/Simulator/Simulator.h"
 #include "MidAPI/ma.h"
 #include "Utils/Os/Linux/linux.h"
 
@@ -110,12 +109,8 @@ void checkProviderConfiguration(const std::string& path) {
 
 void checkAdapters(const Settings& settings) {
     // As a start does it: reading the description is what finds its mistakes.
-    if (settings.adapters.empty()) {
-        ma::enumerateAdapters();
-    } else {
-        ma::Simulator(settings.adapters, settings.adapterState);
-        requireWritable(settings.adapterState, "Check adapters.state.");
-    }
+    ma::selectBackend(adaptersOf(settings));
+    if (!settings.adapterState.empty()) requireWritable(settings.adapterState, "Check adapters.state.");
 }
 
 }  // namespace

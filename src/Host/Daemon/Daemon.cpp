@@ -39,6 +39,18 @@ std::string runningUpdates(core::CimOperations& operations) {
     return text;
 }
 
+void selectAdapters(const Settings& settings) {
+    const ma::BackendChoice adapters = adaptersOf(settings);
+    // What the settings say must be right. What the machine or a variable says may be mended while this runs.
+    if (adapters.backend || adapters.description) ma::selectBackend(adapters);
+    try {
+        const std::string search = ma::describeSearch();
+        if (!search.empty()) report(search);
+    } catch (const ma::AdapterError& error) {
+        reportProblem(std::string("The adapters cannot be had: ") + error.what());
+    }
+}
+
 /// systemd makes the folder of the default lock file and socket (RuntimeDirectory=); without it a start by
 /// hand does.
 const std::string& withItsFolder(const std::string& path) {
@@ -88,13 +100,20 @@ void loadProviders(core::ProviderLibraries& providers, const std::string& direct
     report("Loaded the providers " + names + ".");
 }
 
+ma::BackendChoice adaptersOf(const Settings& settings) {
+    const auto said = [](const std::string& text) {
+        return text.empty() ? std::nullopt : std::optional(text);
+    };
+    return {said(settings.backend), said(settings.adapters), said(settings.adapterState)};
+}
+
 Daemon::Daemon(const Settings& settings)
     : m_settings(settings), m_lock(settings.lockFile), m_session(settings.providerConfiguration) {
     m_lock.require();
     for (const std::string& text : warningsOf(settings, raiseDescriptors(settings)))
         reportProblem("Warning: " + text);
     // Before the providers come, which ask for the adapters as soon as they are called.
-    if (!m_settings.adapters.empty()) ma::configureSimulator(m_settings.adapters, m_settings.adapterState);
+    selectAdapters(m_settings);
     loadProviders(m_session.libraries(), m_settings.providers);
     m_retention.emplace(m_settings.jobs, m_session.operations());
     m_dispatcher = makeDispatcher();

@@ -11,6 +11,7 @@
 #include "Host/Daemon/JobRetention.h"
 #include "Host/Server/HttpServer.h"
 #include "Host/Settings.h"
+#include "MidAPI/AdapterTypes.h"
 #include "Utils/Os/Linux/FileLock.h"
 
 namespace host {
@@ -41,6 +42,9 @@ std::vector<std::string> warningsOf(const Settings& settings, std::uint64_t desc
 std::uint64_t mostDescriptors();
 /// Has it have as many as the settings take, as far as that goes. Returns how many it may have then.
 std::uint64_t raiseDescriptors(const Settings& settings);
+
+/// Which adapters the settings name; what they leave open, the environment and the machine say.
+ma::BackendChoice adaptersOf(const Settings& settings);
 
 /// Loads the provider libraries of a directory. One that does not load is reported, and the others serve.
 /// Throws std::runtime_error when the directory cannot be read, or none of its libraries is a provider.

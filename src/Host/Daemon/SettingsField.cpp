@@ -51,7 +51,10 @@ std::string SettingsField::option() const {
 void SettingsField::set(const std::string& value) const {
     std::visit(
         Overloaded{[&](bool* flag) { *flag = flagIn(*this, value); },
-                   [&](std::string* text) { *text = value; },
+                   [&](std::string* text) {
+                       if (value.size() < least) refuse(*this, value, "a text of at least one character");
+                       *text = value;
+                   },
                    [&](std::vector<std::string>* list) { list->push_back(value); },
                    [&](std::chrono::seconds* time) { *time = std::chrono::seconds(numberIn(*this, value)); },
                    [&](auto* number) {
@@ -110,9 +113,11 @@ std::vector<SettingsField> otherFields(Settings& s) {
             {"providers.directory", &s.providers, 0, 0, "directory of the provider libraries"},
             {"providers.configuration", &s.providerConfiguration, 0, 0,
              "the providers' own configuration file, instead of /etc/quenx-cimprovider.conf"},
-            {"adapters.description", &s.adapters, 0, 0,
+            {"adapters.backend", &s.backend, 1, 0,
+             "which adapters: simulator, or auto for those that there are; instead of QUENX_BACKEND"},
+            {"adapters.description", &s.adapters, 1, 0,
              "file that describes simulated adapters, instead of /etc/quenx-adapters.toml"},
-            {"adapters.state", &s.adapterState, 0, 0,
+            {"adapters.state", &s.adapterState, 1, 0,
              "directory in which they keep their flash, instead of /var/lib/quenx/adapters"},
             {"daemon.lock_file", &s.lockFile, 0, 0, "file that is locked while quenx-cimd runs"}};
 }

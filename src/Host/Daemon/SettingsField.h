@@ -19,7 +19,7 @@ struct SettingsField {
 
     std::string key;  ///< "section.name" in the file; the option is "--section-name"
     Target target;
-    std::uint64_t least;  ///< of a number
+    std::uint64_t least;  ///< of a number; of a text, characters
     std::uint64_t most;
     std::string help;
 

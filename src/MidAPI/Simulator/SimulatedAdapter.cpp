@@ -142,40 +142,39 @@ bool SimulatedAdapter::readComponents(std::vector<utils::FirmwareVersionInfo>& f
         found = components();
         return true;
     } catch (const OperationFailure& failure) {
-        QUENX_ERROR("adapter %s: %s", m_description.name.c_str(), failure.what());
+        QUENX_ERROR("simulated adapter %s: %s", m_description.name.c_str(), failure.what());
         return false;
     } catch (const std::runtime_error& error) {
         throw AdapterError("adapter " + m_description.name + ": " + error.what());
     }
 }
 
-int SimulatedAdapter::prepare(std::span<const std::uint8_t> file, std::span<std::uint8_t> output,
-                              std::uint32_t& imageSize, std::vector<utils::FirmwareType>& types) {
+int SimulatedAdapter::prepare(const ImageBuffers& buffers, std::uint32_t& imageSize,
+                              std::vector<utils::FirmwareType>& types) {
     // Before the verdict: a client that looks now must not see the 100 of an earlier update.
     m_progress.prepared();
     try {
         FaultRun(m_faults, Operation::Prepare).reach();
-        return prepareOrThrow(file, output, imageSize, types);
+        return prepareOrThrow(buffers, imageSize, types);
     } catch (const OperationFailure& failure) {
-        QUENX_ERROR("adapter %s: %s", m_description.name.c_str(), failure.what());
+        QUENX_ERROR("simulated adapter %s: %s", m_description.name.c_str(), failure.what());
         return static_cast<int>(failure.code());
     } catch (const std::runtime_error& error) {
-        QUENX_ERROR("adapter %s: %s", m_description.name.c_str(), error.what());
+        QUENX_ERROR("simulated adapter %s: %s", m_description.name.c_str(), error.what());
         return PrepareStatus::UnspecifiedError;
     }
 }
 
-PrepareStatus SimulatedAdapter::prepareOrThrow(std::span<const std::uint8_t> file,
-                                               std::span<std::uint8_t> output, std::uint32_t& imageSize,
+PrepareStatus SimulatedAdapter::prepareOrThrow(const ImageBuffers& buffers, std::uint32_t& imageSize,
                                                std::vector<utils::FirmwareType>& types) {
     const PreparationTarget target{m_description.ids.vendor, m_description.ids.device,
                                    m_description.canBeUpdated, components()};
-    const Preparation preparation = assessImage(target, file, types);
+    const Preparation preparation = assessImage(target, buffers.file, types);
     if (!preparation.reason.empty())
-        QUENX_ERROR("adapter %s: status %d: %s", m_description.name.c_str(), preparation.status,
+        QUENX_ERROR("simulated adapter %s: status %d: %s", m_description.name.c_str(), preparation.status,
                     preparation.reason.c_str());
     if (!hasOutput(preparation.status)) return preparation.status;
-    imageSize = static_cast<std::uint32_t>(composeChosen(preparation, file, output));
+    imageSize = static_cast<std::uint32_t>(composeChosen(preparation, buffers.file, buffers.output));
     types = preparation.types;
     return preparation.status;
 }

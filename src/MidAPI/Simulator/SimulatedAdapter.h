@@ -9,6 +9,7 @@
 #include <vector>
 
 #include "MidAPI/AdapterTypes.h"
+#include "MidAPI/Image/ImageBuffers.h"
 #include "MidAPI/Image/OptionRom.h"
 #include "MidAPI/Progress.h"
 #include "MidAPI/Simulator/AdapterDescription.h"
@@ -29,7 +30,7 @@ class SimulatedAdapter {
 
     utils::PCIAddr address();
     bool readComponents(std::vector<utils::FirmwareVersionInfo>& components);
-    int prepare(std::span<const std::uint8_t> file, std::span<std::uint8_t> output, std::uint32_t& imageSize,
+    int prepare(const ImageBuffers& buffers, std::uint32_t& imageSize,
                 std::vector<utils::FirmwareType>& types);
     bool write(std::span<const std::uint8_t> image, std::uint32_t& errorCode, std::string& errorText);
     bool updateCapabilityWord(const std::vector<utils::FirmwareType>& types, std::uint32_t& errorCode,
@@ -46,8 +47,8 @@ class SimulatedAdapter {
     std::vector<utils::FirmwareVersionInfo> components();
     void requireWritable(std::span<const std::uint8_t> image) const;
     void writeLocked(std::span<const std::uint8_t> image);
-    PrepareStatus prepareOrThrow(std::span<const std::uint8_t> file, std::span<std::uint8_t> output,
-                                 std::uint32_t& imageSize, std::vector<utils::FirmwareType>& types);
+    PrepareStatus prepareOrThrow(const ImageBuffers& buffers, std::uint32_t& imageSize,
+                                 std::vector<utils::FirmwareType>& types);
 
     const AdapterDescription m_description;
     FlashStore m_store;

@@ -1,8 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "MidAPI/Simulator/Simulator.h"
 
+#include "MidAPI/Image/ImageBuffers.h"
 #include "MidAPI/Simulator/SimulatedAdapter.h"
 #include "Utils/Log.h"
+#include "Utils/Utils.h"
 
 namespace ma {
 namespace {
@@ -21,7 +23,9 @@ bool refuseUnknown(const std::string& name, std::uint32_t& errorCode, std::strin
 }  // namespace
 
 Simulator::Simulator(const std::string& descriptionFile, const std::string& stateDirectory)
-    : Simulator(loadAdapterDescriptions(descriptionFile), stateDirectory) {}
+    : Simulator(loadAdapterDescriptions(descriptionFile), stateDirectory) {
+    m_descriptionFile = descriptionFile;
+}
 
 Simulator::Simulator(std::vector<AdapterDescription> adapters, const std::string& stateDirectory,
                      std::shared_ptr<FlashFiles> files) {
@@ -96,14 +100,13 @@ int Simulator::prepareFlashImage(const std::string& adapter, const std::uint8_t*
                                  std::uint8_t* output, std::uint32_t* imageSize,
                                  std::vector<utils::FirmwareType>& types) {
     SimulatedAdapter* found = find(adapter);
-    // An empty file needs no buffers; it is refused with the other files that are not images.
-    const bool buffersMissing = fileSize != 0 && (file == nullptr || output == nullptr);
-    if (found == nullptr || buffersMissing || imageSize == nullptr || *imageSize < fileSize) {
-        QUENX_ERROR("adapter %s: status %d: %s", adapter.c_str(), PrepareStatus::InvalidParameter,
+    const auto buffers = ImageBuffers::of(file, fileSize, output, imageSize);
+    if (found == nullptr || !buffers) {
+        QUENX_ERROR("simulated adapter %s: status %d: %s", adapter.c_str(), PrepareStatus::InvalidParameter,
                     found == nullptr ? "there is no such adapter" : "a buffer is missing or too small");
         return PrepareStatus::InvalidParameter;
     }
-    return found->prepare({file, fileSize}, {output, *imageSize}, *imageSize, types);
+    return found->prepare(*buffers, *imageSize, types);
 }
 
 bool Simulator::writeFlashImage(const std::string& adapter, const std::uint8_t* image,
@@ -133,8 +136,13 @@ bool Simulator::setBootType(const std::string& adapter, BootType type) {
 
 AdapterInfo Simulator::getAdapterInfo(const std::string& adapter) {
     AdapterInfo info = require(adapter).info();
-    info.backend = kName;
+    info.backend = kSimulatorBackend;
     return info;
+}
+
+std::string Simulator::describeSearch() {
+    return fmt("Simulated adapters were looked for in %s, which describes %zu.", m_descriptionFile.c_str(),
+               m_adapters.size());
 }
 
 }  // namespace ma

@@ -18,9 +18,6 @@ class SimulatedAdapter;
 /// The backend of simulated adapters. Several processes may work on one state directory.
 class QUENX_EXPORT Simulator : public Backend {
   public:
-    /// By which AdapterInfo and the settings call it.
-    static constexpr const char* kName = "simulator";
-
     /// Throw AdapterError when the description, or a flash file that it names, has a mistake in it. The state
     /// directory need not be there: it is made at the first change.
     Simulator(const std::string& descriptionFile, const std::string& stateDirectory);
@@ -52,12 +49,14 @@ class QUENX_EXPORT Simulator : public Backend {
     std::uint16_t getFlashImageUpdateProgress(const std::string& adapter) override;
     bool setBootType(const std::string& adapter, BootType type) override;
     AdapterInfo getAdapterInfo(const std::string& adapter) override;
+    std::string describeSearch() override;
 
   private:
     SimulatedAdapter* find(const std::string& name) const;
     SimulatedAdapter& require(const std::string& name) const;
 
     std::vector<std::unique_ptr<SimulatedAdapter>> m_adapters;  // not changed after construction
+    std::string m_descriptionFile;                              // nor this; empty when there was none
 };
 
 }  // namespace ma

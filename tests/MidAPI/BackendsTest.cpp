@@ -1,0 +1,127 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "MidAPI/Backends.h"
+
+#include <gtest/gtest.h>
+#include <unistd.h>
+
+#include <cstdlib>
+#include <filesystem>
+#include <fstream>
+
+#include "Support/SimulatedAdapters.h"
+#include "Support/TestRoms.h"
+
+namespace {
+
+/// These variables, and no others of those that choose adapters, until the end of the scope. No backend is
+/// chosen at first.
+class ChoosingVariables {
+  public:
+    using Values = std::map<std::string, std::string>;
+
+    explicit ChoosingVariables(const Values& values) : m_backend(ma::setBackend(nullptr)) {
+        for (const char* name : {"QUENX_BACKEND", "QUENX_ADAPTERS", "QUENX_ADAPTER_STATE"}) {
+            if (const char* old = std::getenv(name)) m_old.emplace(name, old);
+            ::unsetenv(name);
+            const auto value = values.find(name);
+            if (value != values.end()) ::setenv(name, value->second.c_str(), 1);
+        }
+    }
+    ChoosingVariables(const ChoosingVariables&) = delete;
+    ChoosingVariables& operator=(const ChoosingVariables&) = delete;
+    ~ChoosingVariables() {
+        for (const char* name : {"QUENX_BACKEND", "QUENX_ADAPTERS", "QUENX_ADAPTER_STATE"})
+            ::unsetenv(name);
+        for (const auto& [name, value] : m_old)
+            ::setenv(name.c_str(), value.c_str(), 1);
+        ma::setBackend(m_backend);
+    }
+
+  private:
+    Values m_old;
+    std::shared_ptr<ma::Backend> m_backend;
+};
+
+bool installsOnEth0() {
+    const test::PreparedImage prepared =
+        test::prepareImage("eth0", test::madeRom({{utils::FirmwareType::PXE, 9}}));
+    return test::writeImage("eth0", prepared.image).done;
+}
+
+/// What is in use after the choice: what it says of its search, or the error.
+std::string searchOf(const ma::BackendChoice& choice) try {
+    ma::selectBackend(choice);
+    return ma::describeSearch();
+} catch (const ma::AdapterError& error) {
+    return error.what();
+}
+
+TEST(BackendsTest, AreChosenByWhatIsSaidThenByTheEnvironment) {
+    const test::TempFolder folder;
+    const std::string five = folder.write("five.toml", test::kTestAdapters);
+    const std::string none = folder.write("none.toml", "");
+    const std::string missing = folder / "missing.toml";
+    const std::string wrong = folder.write("wrong.toml", "adapter = 1");
+    const struct {
+        ChoosingVariables::Values variables;
+        ma::BackendChoice choice;
+        std::string expected;
+    } table[] = {
+        {{{"QUENX_ADAPTERS", five}}, {}, five + ", which describes 5."},
+        {{{"QUENX_ADAPTERS", five}}, {.backend = "auto"}, five + ", which describes 5."},
+        {{{"QUENX_ADAPTERS", five}}, {.description = none}, none + ", which describes 0."},
+        {{{"QUENX_BACKEND", "simulator"}, {"QUENX_ADAPTERS", five}}, {}, five + ", which describes 5."},
+        {{{"QUENX_BACKEND", "simulation"}}, {.description = five}, five + ", which describes 5."},
+        {{{"QUENX_BACKEND", "simulation"}},
+         {},
+         "QUENX_BACKEND: there is no backend \"simulation\"; it must be "},
+        {{}, {.backend = "simulation"}, "there is no backend \"simulation\"; it must be "},
+        // What was meant to name simulated adapters never leads to real ones.
+        {{{"QUENX_ADAPTERS", ""}}, {}, "QUENX_ADAPTERS: it is empty; "},
+        {{{"QUENX_ADAPTERS", missing}}, {}, "QUENX_ADAPTERS: there is no adapter description " + missing},
+        {{{"QUENX_ADAPTERS", wrong}}, {.backend = "auto"}, "QUENX_ADAPTERS: " + wrong},
+        {{{"QUENX_BACKEND", ""}, {"QUENX_ADAPTERS", five}}, {}, "QUENX_BACKEND: it is empty; "},
+        {{{"QUENX_ADAPTER_STATE", ""}}, {.description = five}, "QUENX_ADAPTER_STATE: it is empty; "},
+        {{{"QUENX_ADAPTERS", five}}, {.description = missing}, "there is no adapter description " + missing},
+        {{}, {.description = ""}, "there is no adapter description "},
+    };
+    for (const auto& [variables, choice, expected] : table) {
+        const ChoosingVariables chosen(variables);
+        EXPECT_NE(std::string::npos, searchOf(choice).find(expected)) << searchOf(choice) << "\n" << expected;
+    }
+}
+
+TEST(BackendsTest, StayUntilTheNextOneIsThere) {
+    const test::SimulatedAdapters adapters;
+    const ChoosingVariables none({{"QUENX_ADAPTERS", adapters.folder() / "late.toml"},
+                                  {"QUENX_ADAPTER_STATE", adapters.stateDirectory()}});
+    // A mistake is told at each call until it is mended.
+    EXPECT_THROW(ma::enumerateAdapters(), ma::AdapterError);
+    EXPECT_THROW(ma::enumerateAdapters(), ma::AdapterError);
+    adapters.folder().write("late.toml", test::kTestAdapters);
+    EXPECT_EQ(5U, ma::enumerateAdapters().size());
+    EXPECT_THROW(ma::selectBackend({.description = adapters.folder() / "none.toml"}), ma::AdapterError);
+    EXPECT_EQ(5U, ma::enumerateAdapters().size());
+    EXPECT_EQ("simulator", ma::getAdapterInfo("eth0").backend);
+    EXPECT_TRUE(installsOnEth0());
+    EXPECT_EQ("IMG_PXE 9, IMG_UEFI 0", test::describeRom(adapters->flashContent("eth0")))
+        << "the state is that of the variable";
+}
+
+TEST(BackendsTest, AnswersUntilTheProcessHasEnded) {
+    // As a provider that is still loaded then: its destructor waits for the flash that runs.
+    const auto provider = [] {
+        if (ma::enumerateAdapters().size() != 5 || !installsOnEth0()) ::_exit(1);
+    };
+    const test::TempFolder folder;
+    const std::string description = folder.write("adapters.toml", test::kTestAdapters);
+    EXPECT_EXIT(
+        {
+            std::atexit(provider);
+            ma::selectBackend({.description = description, .state = folder / "state"});
+            std::exit(0);
+        },
+        testing::ExitedWithCode(0), "");
+}
+
+}  // namespace
