@@ -202,7 +202,8 @@ TEST(DaemonTest, ReadsTheSystemsFilesWhereNoneAreNamed) {
                                         etc.path(), program, arguments}),
                          {"QUENX_ADAPTERS"});
     };
-    EXPECT_THAT(withThisEtc(QUENXCTL, "adapters").out, HasSubstr("There are no adapters."));
+    EXPECT_THAT(withThisEtc(QUENXCTL, "adapters").error,
+                HasSubstr("There is no adapter description /etc/quenx-adapters.toml"));
     etc.write("quenx-adapters.toml", test::kTestAdapters);
     etc.write("quenx-cimprovider.conf", "FWFilePath=/etc\n");
     etc.write("new.rom", test::realRom("efi-virtio"));

@@ -29,21 +29,23 @@ TEST_F(InstallTest, WritesTheImageAndSaysWhatChanged) {
     EXPECT_EQ(firmwareOf("eth0"), kOld);
     const ProgramResult result = quenxctl(kInstall);
     EXPECT_EQ(result.status, 0) << result.error;
-    EXPECT_THAT(result.out, EndsWith("eth0 was updated.\n  IMG_PXE   1 -> 2\n  IMG_UEFI  0 -> 2\n"));
+    EXPECT_THAT(result.out,
+                EndsWith("eth0 (simulated) was updated.\n  IMG_PXE   1 -> 2\n  IMG_UEFI  0 -> 2\n"));
     EXPECT_EQ(result.error, "");
-    EXPECT_THAT(
-        quenxctl("adapters").out,
-        ::testing::StartsWith("NAME  PCI      IDS        UPDATABLE  FIRMWARE                 DESCRIPTION\n"
-                              "eth0  03:00.0  1af4:1041  yes        IMG_PXE 2, IMG_UEFI 2    \n"
-                              "eth1  03:00.1  1af4:1041  yes        IMG_PXE 1, IMG_UEFI 0    \n"));
+    EXPECT_THAT(quenxctl("adapters").out,
+                ::testing::StartsWith(
+                    "NAME  BACKEND    PCI      IDS        UPDATABLE  FIRMWARE                 DESCRIPTION\n"
+                    "eth0  simulator  03:00.0  1af4:1041  yes        IMG_PXE 2, IMG_UEFI 2    \n"
+                    "eth1  simulator  03:00.1  1af4:1041  yes        IMG_PXE 1, IMG_UEFI 0    \n"));
     for (const std::string address : {"03:00.0", "0000:03:00.0"}) {
         const ProgramResult again = quenxctl("install --target " + address + " IMAGE");
         EXPECT_EQ(again.status, 3);
         EXPECT_EQ(again.out,
-                  "eth0 is already current: it has IMG_PXE 2, IMG_UEFI 2.\nUse --force to write it again.\n");
+                  "eth0 (simulated) is already current: it has IMG_PXE 2, IMG_UEFI 2.\nUse --force to write "
+                  "it again.\n");
     }
     EXPECT_THAT(quenxctl("update --target eth0 IMAGE --force").out,
-                EndsWith("eth0 was rewritten with the same version.\n"
+                EndsWith("eth0 (simulated) was rewritten with the same version.\n"
                          "  IMG_PXE   2 (unchanged)\n  IMG_UEFI  2 (unchanged)\n"));
 }
 

@@ -46,15 +46,16 @@ TEST_F(InventoryTest, TellsAnOrdinaryUserWhatOnlyRootMaySee) {
 }
 
 TEST_F(InventoryTest, ChangesNothingByACheckAndInstallsByIdentity) {
-    EXPECT_THAT(quenxctl("identities").out,
-                AllOf(HasSubstr("IMG_PXE 2, IMG_UEFI 2  IMG_PXE,IMG_UEFI  file://"),
-                      HasSubstr("/firmware/new.rom"), HasSubstr("/firmware/other.rom"),
-                      HasSubstr("Firmware of adapter eth0"), ::testing::Not(HasSubstr("broken.rom"))));
+    EXPECT_THAT(
+        quenxctl("identities").out,
+        AllOf(HasSubstr("IMG_PXE 2, IMG_UEFI 2  IMG_PXE,IMG_UEFI  file://"), HasSubstr("/firmware/new.rom"),
+              HasSubstr("/firmware/other.rom"), HasSubstr("Firmware of simulated adapter eth0"),
+              ::testing::Not(HasSubstr("broken.rom"))));
 
     const std::string identity = " --target eth0 --identity " + idOf("1af4-1041");
     // A file need not be in the inventory.
     for (const std::string& line : {"check" + identity, std::string("check --target eth0 IMAGE")})
-        EXPECT_EQ(quenxctl(line).out, "The image can be installed on eth0.\n");
+        EXPECT_EQ(quenxctl(line).out, "The image can be installed on eth0 (simulated).\n");
     EXPECT_EQ(firmwareOf("eth0"), "IMG_PXE 1, IMG_UEFI 0");
     EXPECT_EQ(quenxctl("install" + identity).status, 0);
     EXPECT_EQ(firmwareOf("eth0"), "IMG_PXE 2, IMG_UEFI 2");

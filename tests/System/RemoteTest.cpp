@@ -41,7 +41,7 @@ class RemoteTest : public test::Quenxctl {
 };
 
 TEST_F(RemoteTest, UpdatesAndKeepsTheJob) {
-    expectOutput(kInstall, "eth0 was updated.\n  IMG_PXE   1 -> 2\n");
+    expectOutput(kInstall, "eth0 (simulated) was updated.\n  IMG_PXE   1 -> 2\n");
     EXPECT_EQ(quenxctl(kInstall).status, 3);
     expectError("install --target eth3 IMAGE", 1, "The firmware of eth3 cannot be updated.");
 
@@ -51,7 +51,7 @@ TEST_F(RemoteTest, UpdatesAndKeepsTheJob) {
     EXPECT_EQ(jobs[0]["adapter"], "eth0");
     EXPECT_EQ(jobs[0]["user"], nullptr);
     const std::string day = jobs[0].value("startTime", "none").substr(0, 4);
-    expectOutput("jobs", "Job#1  eth0     Completed  100      " + day + "-");
+    expectOutput("jobs", "Job#1  eth0 (simulated)  Completed  100      " + day + "-");
     // A server checks by identity only.
     expectError("check --target eth0 IMAGE", 4, "The service's inventory does not have " + m_daemon.image());
     expectError("check --target eth0 IMAGE --force", 2, "takes neither --types nor --force.");

@@ -8,20 +8,59 @@
 
 #include "Cli/Display/Output.h"
 #include "Cli/Update/Candidate.h"
+#include "MidAPI/ma.h"
 
 namespace cli {
 
 namespace {
 
-/// The text that a port gives under a description, its identifying texts and their descriptions being
-/// parallel.
-std::string identifyingText(const core::InstanceValue& port, std::string_view description) {
-    const std::vector<std::string> texts = port.texts("OtherIdentifyingInfo");
-    const std::vector<std::string> descriptions = port.texts("IdentifyingDescriptions");
+/// The texts that stand under a description: what identifies a port, and what each text is, are parallel
+/// lists.
+std::vector<std::string> textsUnder(const std::vector<std::string>& descriptions,
+                                    const std::vector<std::string>& texts, std::string_view description) {
+    std::vector<std::string> found;
     for (std::size_t i = 0; i < std::min(texts.size(), descriptions.size()); ++i) {
-        if (core::sameName(descriptions[i], description)) return texts[i];
+        if (core::sameName(descriptions[i], description)) found.push_back(texts[i]);
     }
-    return {};
+    return found;
+}
+
+std::vector<std::string> identifyingTexts(const core::InstanceValue& port, std::string_view description) {
+    return textsUnder(port.texts("IdentifyingDescriptions"), port.texts("OtherIdentifyingInfo"), description);
+}
+
+std::string identifyingText(const core::InstanceValue& port, std::string_view description) {
+    const std::vector<std::string> found = identifyingTexts(port, description);
+    return found.empty() ? std::string() : found.front();
+}
+
+constexpr std::string_view kVendor = "Quenx:";
+constexpr const char* kResetNeeded = "Quenx:Reset Needed";
+
+/// What an installed identity is a version of: its image type, or else the driver's name for it.
+Component componentOf(const core::InstanceValue& identity) {
+    const std::vector<std::string> kinds = identity.texts("IdentityInfoType");
+    const std::vector<std::string> types = identity.texts("TargetTypes");
+    Component component;
+    if (!types.empty()) {
+        component.type = types.front();
+    } else if (kinds.size() > 1 && kinds[1].starts_with(kVendor)) {
+        component.type = kinds[1].substr(kVendor.size());  // behind the ids
+    }
+    const std::string label = std::string(kVendor) + component.type;
+    const std::vector<std::string> values = textsUnder(kinds, identity.texts("IdentityInfoValue"), label);
+    const auto number = utils::parseNumber<std::uint32_t>(values.empty() ? "" : values.front());
+    component.version = number.value_or(static_cast<std::uint32_t>(identity.number("MajorVersion")));
+    // Of an image the text repeats type and number.
+    const std::string text = identity.text("VersionString");
+    if (text != component.type + " " + std::to_string(component.version)) component.text = text;
+    return component;
+}
+
+/// An identity that waits for a reset belongs to the one that runs.
+void takeStored(std::vector<Component>& components, const Component& stored) {
+    const auto running = std::ranges::find(components, stored.type, &Component::type);
+    if (running != components.end()) running->stored = stored.text;
 }
 
 /// Without the domain that "lspci -D" prints and the model leaves out.
@@ -57,11 +96,22 @@ bool isSameFile(const std::string& uri, const std::string& other) {
 
 void to_json(Json& json, const Component& component) {
     json = {{"type", component.type}, {"version", component.version}};
+    if (!component.text.empty()) json["text"] = component.text;
+    if (!component.stored.empty()) json["stored"] = component.stored;
+}
+
+const Component* findComponent(const std::vector<Component>& components, std::string_view type) {
+    const auto found = std::ranges::find(components, type, &Component::type);
+    return found == components.end() ? nullptr : &*found;
 }
 
 std::optional<std::uint32_t> versionOf(const std::vector<Component>& components, std::string_view type) {
-    const auto found = std::ranges::find(components, type, &Component::type);
-    return found == components.end() ? std::nullopt : std::optional(found->version);
+    const Component* found = findComponent(components, type);
+    return found == nullptr ? std::nullopt : std::optional(found->version);
+}
+
+std::string labelOf(const std::string& adapter, const std::string& backend) {
+    return backend == ma::kSimulatorBackend ? adapter + " (simulated)" : adapter;
 }
 
 std::string componentsText(const std::vector<Component>& components) {
@@ -69,14 +119,26 @@ std::string componentsText(const std::vector<Component>& components) {
     std::vector<std::string> texts;
     texts.reserve(components.size());
     for (const Component& component : components)
-        texts.push_back(component.type + " " + std::to_string(component.version));
+        texts.push_back(component.type + " " + component.versionText() +
+                        (component.stored.empty() ? "" : " (" + component.stored + " after a reset)"));
     return joined(texts);
 }
 
 void to_json(Json& json, const Adapter& adapter) {
-    json = {{"name", adapter.name}, {"description", adapter.description}, {"pciAddress", adapter.pciAddress},
-            {"ids", adapter.ids},   {"updatable", adapter.updatable},     {"components", adapter.components},
-            {"path", adapter.path}, {"answers", adapter.answers}};
+    json = {{"name", adapter.name},
+            {"backend", adapter.backend},
+            {"description", adapter.description},
+            {"pciAddress", adapter.pciAddress},
+            {"ids", adapter.ids},
+            {"driver", adapter.driver},
+            {"serialNumber", adapter.serialNumber},
+            {"boardSerialNumber", adapter.boardSerialNumber},
+            {"interfaces", adapter.interfaces},
+            {"updatable", adapter.updatable},
+            {"components", adapter.components},
+            {"resetNeeded", adapter.resetNeeded},
+            {"path", adapter.path},
+            {"answers", adapter.answers}};
 }
 
 std::vector<Component> readComponents(core::CimOperations& operations, const core::CimPath& port) {
@@ -84,13 +146,31 @@ std::vector<Component> readComponents(core::CimOperations& operations, const cor
                                                ""};
     std::vector<Component> components;
     for (const core::InstanceValue& identity : operations.associators(port, installed)) {
-        const std::vector<std::string> types = identity.texts("TargetTypes");
-        const auto version = static_cast<std::uint32_t>(identity.number("MajorVersion"));
-        // An installed identity is one component, so has one type, and the version is its major number.
-        if (!types.empty()) components.push_back({types.front(), version});
+        Component component = componentOf(identity);
+        if (component.type.empty()) continue;
+        if (!textsUnder(identity.texts("IdentityInfoType"), identity.texts("IdentityInfoValue"), kResetNeeded)
+                 .empty()) {
+            takeStored(components, component);
+        } else {
+            components.push_back(std::move(component));
+        }
     }
     return components;
 }
+
+namespace {
+
+void readMore(Adapter& adapter, const core::InstanceValue& port) {
+    adapter.backend = backendOf(port);
+    adapter.driver = identifyingText(port, "Driver");
+    adapter.serialNumber = identifyingText(port, "Serial Number");
+    adapter.boardSerialNumber = identifyingText(port, "Board Serial Number");
+    adapter.interfaces = identifyingTexts(port, "Network Interface");
+    const std::string reset = identifyingText(port, "Reset Needed");
+    adapter.resetNeeded = reset.empty() ? "none" : utils::lowerCase(reset);
+}
+
+}  // namespace
 
 std::vector<Adapter> readAdapters(core::CimOperations& operations) {
     std::vector<Adapter> adapters;
@@ -103,8 +183,13 @@ std::vector<Adapter> readAdapters(core::CimOperations& operations) {
         // Unknown to the provider, and not merely not told.
         const bool isUnknown = port.get<std::uint64_t>("EnabledState") == 0U;
         adapters.back().answers = !isUnknown || !adapters.back().components.empty();
+        readMore(adapters.back(), port);
     }
     return adapters;
+}
+
+std::string backendOf(const core::InstanceValue& port) {
+    return identifyingText(port, "Adapter Backend");
 }
 
 std::string adviceForSilence(const Connection& connection) {
@@ -114,10 +199,15 @@ std::string adviceForSilence(const Connection& connection) {
            "reason.";
 }
 
+std::string searchText(const Connection& connection) {
+    return connection.isInProcess ? ma::describeSearch() : "";
+}
+
 std::string adviceForNoAdapters(const Connection& connection) {
     if (!connection.isInProcess) return {};
-    return "Describe simulated ones in /etc/quenx-adapters.toml, or in a file that --adapters or "
-           "QUENX_ADAPTERS names.";
+    const std::string search = searchText(connection);
+    return search + (search.empty() ? "" : " ") +
+           "Simulated ones can be described in a file that --adapters or QUENX_ADAPTERS names.";
 }
 
 Adapter findAdapter(const Connection& connection, const std::string& target) {

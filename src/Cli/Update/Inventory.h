@@ -15,17 +15,25 @@ namespace cli {
 
 /// A firmware component: an image type and its version.
 struct Component {
-    std::string type;  ///< "IMG_PXE"
+    std::string type;  ///< "IMG_PXE"; for what is of no type the driver's name, "fw.mgmt"
     std::uint32_t version = 0;
+    std::string text = {};    ///< the version as the driver tells it; empty where it is the number
+    std::string stored = {};  ///< what takes effect after a reset; empty when nothing waits for one
 
-    bool operator==(const Component&) const = default;
+    std::string versionText() const { return text.empty() ? std::to_string(version) : text; }
+    /// Whether what runs is the same.
+    bool operator==(const Component& other) const {
+        return type == other.type && versionText() == other.versionText();
+    }
 };
 void to_json(nlohmann::ordered_json& json, const Component& component);
 
-/// The version of the component of this type; nothing where there is none.
+/// The component of this type; null where there is none.
+const Component* findComponent(const std::vector<Component>& components, std::string_view type);
+/// Its version.
 std::optional<std::uint32_t> versionOf(const std::vector<Component>& components, std::string_view type);
 
-/// "IMG_PXE 1, IMG_UEFI 0"; "nothing" for none.
+/// "IMG_PXE 1, IMG_UEFI 0", "fw.mgmt 1.2 (1.3 after a reset)"; "nothing" for none.
 std::string componentsText(const std::vector<Component>& components);
 
 /// An adapter port as the model shows it.
@@ -38,8 +46,17 @@ struct Adapter {
     bool updatable = true;
     std::vector<Component> components;  ///< what is installed, as far as it is shown
     bool answers = true;                ///< false when nothing can be read from it
+    std::string backend = {};           ///< by which the service reaches it; empty when not shown
+    std::string driver = {};            ///< likewise, and so for what follows
+    std::string serialNumber = {};
+    std::string boardSerialNumber = {};
+    std::vector<std::string> interfaces = {};
+    std::string resetNeeded = {};  ///< "none", "reload", "reboot", "power cycle", "unknown"
 };
 void to_json(nlohmann::ordered_json& json, const Adapter& adapter);
+
+/// The backend that a port of the model shows; empty when it does not.
+std::string backendOf(const core::InstanceValue& port);
 
 /// All Ethernet ports with what is installed on them, in the model's order.
 std::vector<Adapter> readAdapters(core::CimOperations& operations);
@@ -50,7 +67,14 @@ std::vector<Component> readComponents(core::CimOperations& operations, const cor
 /// What to do about adapters that do not answer.
 std::string adviceForSilence(const Connection& connection);
 
-/// What to do where there are no adapters; empty for a server, which has its own.
+/// The adapter's name with a mark when it is no hardware: for results, which must not be taken for more than
+/// they are.
+std::string labelOf(const std::string& adapter, const std::string& backend);
+
+/// What was looked for and what was found; empty for a server, which has its own.
+std::string searchText(const Connection& connection);
+
+/// What was looked for, and what to do, where there are no adapters; empty for a server.
 std::string adviceForNoAdapters(const Connection& connection);
 
 /// The adapter that a user means: by its name, its PCI address with or without the domain, or the text of its

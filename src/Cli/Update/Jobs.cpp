@@ -8,6 +8,7 @@
 
 #include "Cli/Display/Messages.h"
 #include "Cli/Display/Output.h"
+#include "Cli/Update/Inventory.h"
 
 namespace cli {
 
@@ -31,18 +32,24 @@ void nameAdapters(core::CimOperations& operations, std::vector<JobView>& jobs) {
     std::unordered_map<std::string, JobView*> byPath;
     for (JobView& job : jobs)
         byPath.emplace(keyOf(job.path), &job);
-    std::unordered_map<std::string, std::string> portNames;
+    struct Named {
+        std::string adapter;
+        std::string backend;
+    };
+    std::unordered_map<std::string, Named> ports;
     for (const core::InstanceValue& port : operations.enumerateInstances("Quenx_EthernetPort"))
-        portNames.emplace(keyOf(port.path), port.text("Name"));
+        ports.emplace(keyOf(port.path), Named{port.text("Name"), backendOf(port)});
     // Three enumerations in all: asking for the associators of each job would be a request for each.
     for (const core::CimPath& affected : operations.enumerateInstanceNames("Quenx_AffectedJobElement")) {
         const core::CimPath* element = endOf(affected, "AffectedElement");
         const core::CimPath* affecting = endOf(affected, "AffectingElement");
         if (element == nullptr || affecting == nullptr) continue;
-        const auto port = portNames.find(keyOf(*element));
+        const auto port = ports.find(keyOf(*element));
         const auto job = byPath.find(keyOf(*affecting));
         // A job affects the card of its port, too; only the port is an adapter.
-        if (port != portNames.end() && job != byPath.end()) job->second->adapter = port->second;
+        if (port == ports.end() || job == byPath.end()) continue;
+        job->second->adapter = port->second.adapter;
+        job->second->backend = port->second.backend;
     }
 }
 
@@ -129,6 +136,7 @@ void to_json(Json& json, const JobView& job) {
     json = {{"path", job.path},
             {"id", job.id},
             {"adapter", orNull(job.adapter)},
+            {"backend", orNull(job.backend)},
             {"startTime", job.start ? Json(core::datetimeText(*job.start)) : Json()},
             {"user", orNull(job.user)},
             {"state", job.state},

@@ -26,6 +26,7 @@ struct JobView {
     unsigned percent = 0;
     std::uint16_t errorCode = 0;
     std::string errorDescription;
+    std::string backend = {};  ///< that reaches the adapter; empty when that is not shown
 
     /// No further change will come.
     bool hasEnded() const { return state >= JobStateCompleted && state <= JobStateException; }

@@ -14,6 +14,8 @@ namespace {
 struct Outcome {
     explicit Outcome(const Candidate& candidate)
         : adapter(candidate.adapter.name),
+          label(labelOf(candidate.adapter.name, candidate.adapter.backend)),
+          backend(candidate.adapter.backend),
           uri(candidate.uri),
           before(candidate.adapter.components),
           after(before) {}
@@ -35,6 +37,8 @@ struct Outcome {
     std::string message;  ///< what happened
     std::string advice;   ///< what to do next; may be empty
     std::string adapter;
+    std::string label;  ///< the adapter's, for results
+    std::string backend;
     std::string uri;
     std::optional<std::uint32_t> returnValue;  ///< of the method, when it was called
     std::optional<JobView> job;                ///< when one was started
@@ -43,32 +47,40 @@ struct Outcome {
 };
 
 void to_json(Json& json, const Outcome& outcome) {
-    json = {{"result", outcome.result},   {"exitStatus", static_cast<int>(outcome.status)},
-            {"message", outcome.message}, {"advice", outcome.advice},
-            {"adapter", outcome.adapter}, {"uri", outcome.uri},
-            {"returnValue", nullptr},     {"job", nullptr},
-            {"before", outcome.before},   {"after", outcome.after}};
+    json = {{"result", outcome.result},
+            {"exitStatus", static_cast<int>(outcome.status)},
+            {"message", outcome.message},
+            {"advice", outcome.advice},
+            {"adapter", outcome.adapter},
+            {"backend", outcome.backend},
+            {"uri", outcome.uri},
+            {"returnValue", nullptr},
+            {"job", nullptr},
+            {"before", outcome.before},
+            {"after", outcome.after}};
     if (outcome.returnValue) json["returnValue"] = *outcome.returnValue;
     if (outcome.job) json["job"] = *outcome.job;
 }
 
-/// "1 -> 2", "1 (unchanged)"
-std::string changeText(std::optional<std::uint32_t> before, std::optional<std::uint32_t> after) {
-    const auto text = [](std::optional<std::uint32_t> version) {
-        return version ? std::to_string(*version) : std::string("none");
+/// "1 -> 2", "1 (unchanged)", "1.2 -> 1.3 after a reset"
+std::string changeText(const Component* before, const Component* after) {
+    const auto text = [](const Component* component) {
+        return component == nullptr ? std::string("none") : component->versionText();
     };
-    return before == after ? text(after) + " (unchanged)" : text(before) + " -> " + text(after);
+    if (after != nullptr && !after->stored.empty())
+        return text(after) + " -> " + after->stored + " after a reset";
+    return text(before) == text(after) ? text(after) + " (unchanged)" : text(before) + " -> " + text(after);
 }
 
 void printChange(std::ostream& out, const Outcome& outcome) {
     std::vector<std::vector<std::string>> rows;
     for (const Component& component : outcome.after) {
-        rows.push_back({"  " + component.type,
-                        changeText(versionOf(outcome.before, component.type), component.version)});
+        rows.push_back(
+            {"  " + component.type, changeText(findComponent(outcome.before, component.type), &component)});
     }
     for (const Component& component : outcome.before) {
-        if (outcome.after.empty() || versionOf(outcome.after, component.type)) continue;
-        rows.push_back({"  " + component.type, changeText(component.version, std::nullopt)});
+        if (outcome.after.empty() || findComponent(outcome.after, component.type) != nullptr) continue;
+        rows.push_back({"  " + component.type, changeText(&component, nullptr)});
     }
     printTable(out, rows);
 }
@@ -87,9 +99,9 @@ ExitStatus print(Context& context, const Outcome& outcome) {
 }
 
 void endAsCurrent(Outcome& outcome, const Candidate& candidate) {
-    outcome.end(ExitStatus::AlreadyCurrent, "already current",
-                outcome.adapter + " is already current: it has " +
-                    componentsText(candidate.comparison->chosen) + ".");
+    outcome.end(
+        ExitStatus::AlreadyCurrent, "already current",
+        outcome.label + " is already current: it has " + componentsText(candidate.comparison->chosen) + ".");
 }
 
 /// If the adapter still has the old versions, the update did not complete, although the service says so.
@@ -110,7 +122,7 @@ void judgeCompleted(Outcome& outcome, const Candidate& candidate) {
     } else {
         const bool wasCurrent = candidate.comparison && candidate.comparison->current;
         outcome.end(ExitStatus::Done, "updated",
-                    name + (wasCurrent ? " was rewritten with the same version." : " was updated."));
+                    outcome.label + (wasCurrent ? " was rewritten with the same version." : " was updated."));
         if (outcome.after.empty() && !outcome.before.empty())
             outcome.advice = "Its versions cannot be read now; \"quenxctl adapters\" shows them later.";
     }
@@ -149,6 +161,7 @@ void followUpdate(Context& context, const core::CimPath& job, const Candidate& c
         return;
     }
     outcome.job->adapter = outcome.adapter;
+    outcome.job->backend = outcome.backend;
     outcome.after = readBack(operations, candidate);
     if (outcome.job->hasSucceeded()) {
         judgeCompleted(outcome, candidate);
@@ -250,8 +263,7 @@ ExitStatus check(Context& context, const VerbOptions& options) {
     } else if (!candidate.force && candidate.isAlreadyCurrent()) {
         endAsCurrent(outcome, candidate);
     } else {
-        outcome.end(ExitStatus::Done, "installable",
-                    "The image can be installed on " + outcome.adapter + ".");
+        outcome.end(ExitStatus::Done, "installable", "The image can be installed on " + outcome.label + ".");
     }
     return print(context, outcome);
 }

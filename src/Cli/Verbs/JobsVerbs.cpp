@@ -41,7 +41,7 @@ void printJobs(std::ostream& out, const std::vector<JobView>& jobs) {
     std::vector<std::vector<std::string>> rows = {{"JOB", "ADAPTER", "STATE", "PERCENT", "START"}};
     for (const JobView& job : jobs) {
         const std::optional<unsigned> percent = job.certainPercent();
-        rows.push_back({job.id, orDash(job.adapter), job.stateName(),
+        rows.push_back({job.id, orDash(labelOf(job.adapter, job.backend)), job.stateName(),
                         percent ? std::to_string(*percent) : "-", startText(job)});
     }
     for (std::size_t i = 0; i < rows.size(); ++i) {

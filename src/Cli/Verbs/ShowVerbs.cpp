@@ -1,5 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 // The verbs that only show what there is: adapters and identities, instances and their associations.
+#include <algorithm>
+
 #include "Cli/Display/Output.h"
 #include "Cli/Verbs/Verbs.h"
 
@@ -79,27 +81,32 @@ ExitStatus showAround(Context& context, const VerbOptions& options, List list, L
 ExitStatus showAdapters(Context& context, const VerbOptions&) {
     const std::vector<Adapter> adapters = readAdapters(*context.connection.operations);
     if (context.json) {
-        printJson(context.out, {{"adapters", adapters}});
+        printJson(context.out, {{"adapters", adapters}, {"search", searchText(context.connection)}});
         return ExitStatus::Done;
     }
     if (adapters.empty()) {
         context.out << "There are no adapters.\n";
         const std::string advice = adviceForNoAdapters(context.connection);
-        if (!advice.empty()) context.out << advice << '\n';
+        if (!advice.empty()) context.out << printable(advice) << '\n';
         return ExitStatus::Done;
     }
     std::vector<std::vector<std::string>> rows = {
-        {"NAME", "PCI", "IDS", "UPDATABLE", "FIRMWARE", "DESCRIPTION"}};
+        {"NAME", "BACKEND", "PCI", "IDS", "UPDATABLE", "FIRMWARE", "DESCRIPTION"}};
     std::vector<std::string> silent;
     for (const Adapter& adapter : adapters) {
         const std::string firmware = !adapter.answers             ? "?"
                                      : adapter.components.empty() ? "-"
                                                                   : componentsText(adapter.components);
-        rows.push_back({adapter.name, adapter.pciAddress, adapter.ids, adapter.updatable ? "yes" : "no",
-                        firmware, adapter.description});
+        rows.push_back({adapter.name, adapter.backend, adapter.pciAddress, adapter.ids,
+                        adapter.updatable ? "yes" : "no", firmware, adapter.description});
         if (!adapter.answers) silent.push_back(adapter.name);
     }
     printTable(context.out, rows);
+    // Why that is so is the next question.
+    if (std::ranges::none_of(adapters, &Adapter::updatable)) {
+        const std::string search = searchText(context.connection);
+        if (!search.empty()) context.out << printable(search) << '\n';
+    }
     if (!silent.empty())
         context.error << "The firmware of " << printable(joined(silent)) << " cannot be read. "
                       << adviceForSilence(context.connection) << '\n';

@@ -7,6 +7,24 @@
 
 namespace inventory {
 
+namespace {
+
+/// What only some backends tell.
+void addTold(std::vector<Identification>& rows, const ma::AdapterInfo& info) {
+    const auto add = [&rows](std::string description, const std::string& text) {
+        if (!text.empty()) rows.push_back({std::move(description), text});
+    };
+    add("Adapter Backend", info.backend);
+    add("Driver", info.driver);
+    add("Serial Number", info.serialNumber);
+    add("Board Serial Number", info.boardSerialNumber);
+    for (const ma::NamedVersion& version : info.versions)
+        add(version.name, version.fixed);
+    if (info.resetNeeded != ma::ResetNeeded::None) add("Reset Needed", resetText(info.resetNeeded));
+}
+
+}  // namespace
+
 std::vector<Port> readPorts() {
     std::vector<Port> ports;
     for (const std::string& adapter : ma::enumerateAdapters()) {
@@ -37,7 +55,24 @@ std::vector<Identification> identify(const std::string& address, const std::opti
             {"PCI Subsystem Vendor and Device ID", ma::formatIds(ids.subsystemVendor, ids.subsystemDevice)});
     }
     rows.push_back({"Firmware Update", updatable ? "Supported" : "Not Supported"});
+    if (info) addTold(rows, *info);
     return rows;
+}
+
+const char* resetText(ma::ResetNeeded reset) {
+    switch (reset) {
+        case ma::ResetNeeded::None:
+            return "None";
+        case ma::ResetNeeded::Reload:
+            return "Reload";
+        case ma::ResetNeeded::Reboot:
+            return "Reboot";
+        case ma::ResetNeeded::PowerCycle:
+            return "Power Cycle";
+        case ma::ResetNeeded::Unknown:
+            break;
+    }
+    return "Unknown";
 }
 
 }  // namespace inventory

@@ -35,14 +35,17 @@ std::optional<ma::AdapterInfo> readInfo(const std::string& adapter);
 
 /// A row of OtherIdentifyingInfo with its row of IdentifyingDescriptions.
 struct Identification {
-    const char* description;
+    std::string description;
     std::string info;
 };
 
-/// How a port or a card is identified beside its keys: where it is, what it is, and whether its firmware can
-/// be updated. What is not known is left out.
+/// How a port or a card is identified beside its keys: where it is, what it is, whether its firmware can be
+/// updated, which backend and driver reach it, and which reset it waits for. What is not known is left out.
 std::vector<Identification> identify(const std::string& address, const std::optional<ma::AdapterInfo>& info,
                                      bool updatable);
+
+/// "Power Cycle"
+const char* resetText(ma::ResetNeeded reset);
 
 /// Puts the rows into the two arrays that stand for them.
 template <class Device>
@@ -51,7 +54,7 @@ void setIdentification(Device& device, std::vector<Identification> rows) {
     std::vector<std::string> descriptions;
     for (Identification& row : rows) {
         infos.push_back(std::move(row.info));
-        descriptions.emplace_back(row.description);
+        descriptions.push_back(std::move(row.description));
     }
     device.OtherIdentifyingInfo = std::move(infos);
     device.IdentifyingDescriptions = std::move(descriptions);

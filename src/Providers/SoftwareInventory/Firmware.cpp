@@ -3,6 +3,7 @@
 
 #include <sys/stat.h>
 
+#include <algorithm>
 #include <cinttypes>
 
 #include "MidAPI/Image/RomFormat.h"
@@ -27,9 +28,53 @@ std::vector<FirmwareComponent> namedComponents(const std::vector<utils::Firmware
     std::vector<FirmwareComponent> result;
     for (const utils::FirmwareVersionInfo& component : components) {
         const std::string_view type = ma::firmwareTypeName(component.type);
-        if (!type.empty()) result.push_back({std::string(type), component.version});
+        if (!type.empty()) result.push_back({.type = std::string(type), .version = component.version});
     }
     return result;
+}
+
+/// The texts that the driver tells of a component's versions. Where it tells none, there is only the number.
+const ma::NamedVersion* findVersion(const ma::AdapterInfo& info, const FirmwareComponent& component) {
+    const auto found = std::ranges::find_if(info.versions, [&](const ma::NamedVersion& version) {
+        return ma::firmwareTypeName(version.type) == component.type;
+    });
+    return found == info.versions.end() ? nullptr : &*found;
+}
+
+/// What is installed on a port, in the order of the types, and behind them what is of no type.
+std::vector<FirmwareComponent> installedComponents(const ma::AdapterInfo& info) {
+    std::vector<FirmwareComponent> result = namedComponents(info.components);
+    for (FirmwareComponent& component : result) {
+        if (const ma::NamedVersion* version = findVersion(info, component)) {
+            component.name = version->name;
+            component.text = version->running;
+        }
+    }
+    for (const ma::NamedVersion& version : info.versions) {
+        if (version.type == utils::FirmwareType::None && !version.running.empty())
+            result.push_back({.name = version.name, .text = version.running});
+    }
+    return result;
+}
+
+void addInstalled(std::vector<Firmware>& installed, const Port& port, const ma::AdapterInfo& info) {
+    for (FirmwareComponent& component : installedComponents(info)) {
+        Firmware firmware{.identifier = port.adapter + ":" + component.label(),
+                          .typeCode = SoftwareIdentity::InstalledComponent,
+                          .adapter = port.adapter,
+                          .backend = info.backend,
+                          .ids = ma::formatIds(info.ids.vendor, info.ids.device),
+                          .components = {component}};
+        installed.push_back(firmware);
+        const auto version = std::ranges::find(info.versions, component.name, &ma::NamedVersion::name);
+        if (version == info.versions.end() || !version->isPending()) continue;
+        firmware.identifier += ":stored";
+        firmware.waitsFor = info.resetNeeded;
+        // The number is that of the version that runs.
+        firmware.components.front().version = 0;
+        firmware.components.front().text = version->stored;
+        installed.push_back(std::move(firmware));
+    }
 }
 
 /// Larger than any chain of images of one card; keeps a stray disk image out of memory.
@@ -80,15 +125,8 @@ std::vector<Firmware> readInstalled(const std::vector<Port>& ports) {
     std::vector<Firmware> installed;
     for (const Port& port : ports) {
         const std::optional<ma::AdapterInfo> info = readInfo(port.adapter);
-        if (!info) continue;
         // Components are updated one by one, so each has an identity with a version of its own.
-        for (FirmwareComponent& component : namedComponents(info->components)) {
-            installed.push_back({.identifier = port.adapter + ":" + component.type,
-                                 .typeCode = SoftwareIdentity::InstalledComponent,
-                                 .adapter = port.adapter,
-                                 .ids = ma::formatIds(info->ids.vendor, info->ids.device),
-                                 .components = {std::move(component)}});
-        }
+        if (info) addInstalled(installed, port, *info);
     }
     return installed;
 }

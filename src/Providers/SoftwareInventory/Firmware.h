@@ -4,6 +4,7 @@
 #include <cstdint>
 #include <map>
 #include <memory>
+#include <optional>
 #include <span>
 #include <string>
 #include <vector>
@@ -15,10 +16,16 @@
 
 namespace inventory {
 
-/// A part of a firmware: an image of one type.
+/// A part of a firmware: an image of one type, or what a driver has a version of.
 struct FirmwareComponent {
-    std::string type;  ///< "IMG_PXE"
+    std::string type = {};  ///< "IMG_PXE"; empty for what is of no type
     std::uint32_t version = 0;
+    std::string name = {};  ///< by which the driver tells the version; empty for an image
+    std::string text = {};  ///< the version as the driver tells it; empty for an image
+
+    /// What stands for it in texts.
+    const std::string& label() const { return type.empty() ? name : type; }
+    std::string versionText() const { return text.empty() ? std::to_string(version) : text; }
 
     bool operator==(const FirmwareComponent&) const = default;
 };
@@ -28,10 +35,13 @@ struct Firmware {
     std::string identifier;
     SoftwareIdentity::TypeCode typeCode = SoftwareIdentity::FirmwareImage;
     std::string adapter;                        ///< on which it is installed; empty for a file
+    std::string backend = {};                   ///< that reaches the adapter
     std::string ids;                            ///< vendor and device, as "1af4:1041"
     std::vector<FirmwareComponent> components;  ///< in ascending order of type
     std::string manufacturer = {};              ///< empty when the image names none
     std::string product = {};                   ///< likewise
+    /// What it waits for, having been written to the adapter; nothing for what runs, and for a file.
+    std::optional<ma::ResetNeeded> waitsFor = {};
 
     bool operator==(const Firmware&) const = default;
 };
@@ -40,8 +50,8 @@ struct Firmware {
 /// copy of the file, or the file under another name, is the same firmware.
 Firmware describeImage(std::span<const std::uint8_t> file, const ma::RomFile& rom);
 
-/// What is installed on the ports, one firmware for each component, so that each has its own version. A port
-/// that does not answer has none.
+/// What is installed on the ports, one firmware for each component, so that each has its own version, and
+/// behind it, where another version waits for a reset, that one. A port that does not answer has none.
 std::vector<Firmware> readInstalled(const std::vector<Port>& ports);
 
 /// A file of intact ROM images, and what is in it.

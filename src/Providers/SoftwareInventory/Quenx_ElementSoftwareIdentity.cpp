@@ -13,6 +13,7 @@ namespace {
 constexpr std::uint16_t kUpgradedByOwner = 2;
 constexpr std::uint16_t kNeverUpgraded = 4;
 constexpr std::uint16_t kStatusCurrent = 2;
+constexpr std::uint16_t kStatusNext = 3;
 
 void associate(const Quenx_SoftwareIdentity* identity, const Quenx_EthernetPort* port, Rebuild& rebuilt) {
     auto& association = rebuilt.add<Quenx_ElementSoftwareIdentity>();
@@ -20,7 +21,7 @@ void associate(const Quenx_SoftwareIdentity* identity, const Quenx_EthernetPort*
     association.Dependent = port;
     association.UpgradeCondition =
         ma::getCanBeUpdated(port->getAdapterName()) ? kUpgradedByOwner : kNeverUpgraded;
-    association.ElementSoftwareStatus = {kStatusCurrent};
+    association.ElementSoftwareStatus = {identity->isDormant() ? kStatusNext : kStatusCurrent};
 }
 
 }  // namespace

@@ -26,9 +26,14 @@ void Quenx_EthernetPort::refresh() {
     const std::optional<ma::AdapterInfo> info = inventory::readInfo(m_port.adapter);
     const bool updatable = ma::getCanBeUpdated(m_port.adapter);
 
+    std::vector<inventory::Identification> rows =
+        inventory::identify(utils::formatPCIAddr(m_port.address), info, updatable);
+    if (info) {
+        for (const std::string& interface : info->interfaces)
+            rows.push_back({"Network Interface", interface});
+    }
     const core::RecursiveLocker lock(getMutex());
-    inventory::setIdentification(*this,
-                                 inventory::identify(utils::formatPCIAddr(m_port.address), info, updatable));
+    inventory::setIdentification(*this, std::move(rows));
     setLink(info);
 }
 

@@ -9,7 +9,9 @@
 /// A firmware: one in a file that can be installed, or one component that an adapter carries.
 ///
 /// The only version of the image format is a 16-bit code revision for each image. MajorVersion is the highest
-/// of them; VersionString, and IdentityInfoValue beside IdentityInfoType "Quenx:IMG_...", have all.
+/// of them; VersionString, and IdentityInfoValue beside IdentityInfoType "Quenx:IMG_...", have all. Of an
+/// installed component whose driver tells a text, VersionString is that text, and MajorVersion and those
+/// below it are the numbers in it, if it is made of numbers; IdentityInfoValue has the number of its type.
 class Quenx_SoftwareIdentity final : public CIM_SoftwareIdentity, public inventory::SoftwareIdentity {
   public:
     static constexpr core::CimClassInfo classInfo{"Quenx_SoftwareIdentity", &CIM_SoftwareIdentity::classInfo};
@@ -26,9 +28,12 @@ class Quenx_SoftwareIdentity final : public CIM_SoftwareIdentity, public invento
 
     /// The adapter on which the firmware is installed; empty for a file.
     const std::string& getAdapterName() const { return m_firmware.adapter; }
+    /// True for what was written to the adapter and is in force only after a reset.
+    bool isDormant() const { return m_firmware.waitsFor.has_value(); }
 
   private:
     void setVersions();
+    void setToldVersion(const std::string& text);
     void setKind();
 
     const inventory::Firmware m_firmware;

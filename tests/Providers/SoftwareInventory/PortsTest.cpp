@@ -41,7 +41,7 @@ TEST_F(PortsTest, StayTheSameObjectsWhileTheAdaptersDo) {
     changed = test::kTestAdapters;
     changeAdapters(changed.replace(changed.find("0000:03:00.1"), 12, "0000:09:00.1"));
     EXPECT_EQ(table("Quenx_EthernetPort", {"OtherIdentifyingInfo"}).at(1),
-              "09:00.1,1af4:1041,1af4:1041,Supported");
+              "09:00.1,1af4:1041,1af4:1041,Supported,simulator");
     EXPECT_EQ(table("Quenx_PortController", {"Name"}), (Rows{"03:00", "09:00", "04:00", "05:00", "06:00"}));
 }
 
@@ -59,17 +59,56 @@ TEST_F(PortsTest, ThatDoNotAnswerHideNoOthers) {
                "Description", "PermanentAddress", "NetworkAddresses", "Speed"});
     EXPECT_EQ(ports.at(0), "eth0; 0; 0; 0; 03:00.0,Supported; ; ; ; ");
     EXPECT_EQ(ports.at(1),
-              "eth1; 6; 5; 2; 03:00.1,1af4:1041,1af4:1041,Supported; ; 525400000011; "
+              "eth1; 6; 5; 2; 03:00.1,1af4:1041,1af4:1041,Supported,simulator; ; 525400000011; "
               "525400000011; 10000000000");
     const Rows controllers = table("Quenx_PortController", {"Name", "EnabledState", "HealthState",
                                                             "OtherIdentifyingInfo", "Description"});
-    EXPECT_EQ(controllers.front(), "03:00; 2; 5; 03:00,1af4:1041,1af4:1041,Supported; ");
+    EXPECT_EQ(controllers.front(), "03:00; 2; 5; 03:00,1af4:1041,1af4:1041,Supported,simulator; ");
     EXPECT_EQ(controllers.back(), "06:00; 0; 0; 06:00,Supported; ");
 
     m_adapters->injectFault("eth2", {.at = ma::Operation::PciAddress});
     EXPECT_EQ(table("Quenx_EthernetPort", {"Name"}), (Rows{"eth0", "eth1", "eth3", "eth4"}));
     EXPECT_EQ(table("Quenx_PortController", {"Name", "EnabledState"}),
               (Rows{"03:00; 2", "05:00; 2", "06:00; 0"}));
+}
+
+TEST_F(PortsTest, TellWhatTheirDriverTells) {
+    m_backend->told = [](const std::string& adapter, ma::AdapterInfo& info) {
+        if (adapter != "eth0") return;
+        info.backend = "devlink";
+        info.driver = "fastnic";
+        info.serialNumber = "S1";
+        info.boardSerialNumber = "B1";
+        info.versions = {
+            {.name = "board.id", .fixed = "K12"},
+            {.name = "fw.mgmt", .running = "1.2.3", .stored = "1.3.0"},
+            {.name = "fw.undi", .running = "v1 beta", .stored = "v1 beta", .type = utils::FirmwareType::PXE}};
+        info.resetNeeded = ma::ResetNeeded::PowerCycle;
+        info.interfaces = {"ens1", "ens2"};
+    };
+    EXPECT_EQ(table("Quenx_EthernetPort", {"OtherIdentifyingInfo"}).front(),
+              "03:00.0,1af4:1041,1af4:1041,Supported,devlink,fastnic,S1,B1,K12,Power Cycle,ens1,ens2");
+    EXPECT_EQ(table("Quenx_EthernetPort", {"IdentifyingDescriptions"}).front(),
+              "PCI Address,PCI Vendor and Device ID,PCI Subsystem Vendor and Device ID,Firmware Update,"
+              "Adapter Backend,Driver,Serial Number,Board Serial Number,board.id,Reset Needed,"
+              "Network Interface,Network Interface");
+    EXPECT_EQ(table("Quenx_PortController", {"OtherIdentifyingInfo"}).front(),
+              "03:00,1af4:1041,1af4:1041,Supported,devlink,fastnic,S1,B1,K12,Power Cycle");
+
+    // One identity for what runs, and one behind it for what waits. The texts stay, beside the numbers.
+    Rows identities = table("Quenx_SoftwareIdentity",
+                            {"InstanceID", "VersionString", "MajorVersion", "RevisionNumber", "TargetTypes",
+                             "IdentityInfoValue", "Classifications", "OperationalStatus"});
+    identities.resize(4);
+    EXPECT_EQ(identities, (Rows{
+                              "Quenx:eth0:IMG_PXE; v1 beta; ; ; IMG_PXE; 1af4:1041,1; 10,11; 2",
+                              "Quenx:eth0:IMG_UEFI; IMG_UEFI 0; 0; ; IMG_UEFI; 1af4:1041,0; 10,2; 2",
+                              "Quenx:eth0:fw.mgmt; 1.2.3; 1; 3; ; 1af4:1041,1.2.3; 10; 2",
+                              "Quenx:eth0:fw.mgmt:stored; 1.3.0; 1; 0; ; 1af4:1041,1.3.0,Power Cycle; 10; 15",
+                          }));
+    Rows statuses = table("Quenx_ElementSoftwareIdentity", {"ElementSoftwareStatus"});
+    statuses.resize(4);
+    EXPECT_EQ(statuses, (Rows{"2", "2", "2", "3"}));
 }
 
 }  // namespace

@@ -22,6 +22,7 @@ class HookedBackend : public ma::Backend {
     std::function<void(const std::string& operation)> hook;
     std::optional<int> prepareStatus;
     std::optional<std::string> capabilityText;  ///< also of a word that was written
+    std::function<void(const std::string& adapter, ma::AdapterInfo& info)> told;
 
     /// Has every call of the operation wait from now on, until letGo().
     void hold(const std::string& operation) {
@@ -74,7 +75,9 @@ class HookedBackend : public ma::Backend {
         return at("setBootType").setBootType(adapter, type);
     }
     ma::AdapterInfo getAdapterInfo(const std::string& adapter) override {
-        return at("getAdapterInfo").getAdapterInfo(adapter);
+        ma::AdapterInfo info = at("getAdapterInfo").getAdapterInfo(adapter);
+        if (told) told(adapter, info);
+        return info;
     }
 
   private:
