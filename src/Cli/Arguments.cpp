@@ -63,10 +63,10 @@ void addCommonOptions(CLI::App& app, Arguments& arguments) {
     CLI::Option* config =
         addValue(app, "--config", providers.configFile, "FILE",
                  "Configuration file of the providers (default: /etc/quenx-cimprovider.conf)");
-    CLI::Option* backend =
-        addValue(app, "--backend", providers.adapters.backend, "NAME",
-                 "Which adapters: simulator, or auto for those that there are (default: QUENX_BACKEND, else "
-                 "auto)");
+    CLI::Option* backend = addValue(
+        app, "--backend", providers.adapters.backend, "NAME",
+        "Which adapters: devlink for this machine's own, simulator, or auto (default: QUENX_BACKEND, "
+        "else auto: simulated ones where some are described by name, else the machine's own)");
     CLI::Option* adapters = addValue(app, "--adapters", providers.adapters.description, "FILE",
                                      "Description of simulated adapters (default: QUENX_ADAPTERS, else "
                                      "/etc/quenx-adapters.toml)");

@@ -85,8 +85,9 @@ enum class ResetNeeded {
     Unknown,     ///< the adapter does not tell
 };
 
-/// AdapterInfo::backend of adapters that are files, not hardware.
+/// What AdapterInfo::backend is of adapters that are files, and of the machine's own.
 inline constexpr const char* kSimulatorBackend = "simulator";
+inline constexpr const char* kDevlinkBackend = "devlink";
 
 /// What is known of an adapter port beside its firmware update. What a backend cannot tell stays as it is
 /// here.

@@ -6,6 +6,8 @@
 #include <algorithm>
 #include <cstdlib>
 
+#include "MidAPI/Devlink/DevlinkBackend.h"
+#include "MidAPI/Devlink/PciFunctions.h"
 #include "MidAPI/Simulator/Simulator.h"
 #include "Utils/Utils.h"
 
@@ -25,15 +27,21 @@ Claim claimOfSimulator(const BackendChoice& choice) {
 }
 
 std::shared_ptr<Backend> makeSimulator(const BackendChoice& choice) {
-    // A machine without simulated adapters has no description, and no adapters; that is not a mistake.
-    const bool isWanted = choice.description || choice.backend == kSimulatorBackend;
-    if (!isWanted && claimOfSimulator(choice) == Claim::None)
-        return std::make_shared<Simulator>(std::vector<AdapterDescription>{}, "");
     return std::make_shared<Simulator>(choice.description.value_or(kDefaultDescription),
                                        choice.state.value_or(kDefaultState));
 }
 
+Claim claimOfDevlink(const BackendChoice&) {
+    devlink::LinuxMachine machine;
+    return devlink::findPciFunctions(machine).empty() ? Claim::Possible : Claim::Present;
+}
+
+std::shared_ptr<Backend> makeDevlink(const BackendChoice&) {
+    return std::make_shared<devlink::DevlinkBackend>(devlink::loadSettings());
+}
+
 constexpr BackendKind kKinds[] = {
+    {kDevlinkBackend, false, claimOfDevlink, makeDevlink},
     {kSimulatorBackend, true, claimOfSimulator, makeSimulator},
 };
 

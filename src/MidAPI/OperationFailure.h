@@ -22,8 +22,9 @@ class OperationFailure : public std::runtime_error {
 
 /// Runs an operation and turns what it throws into the adapter API's code and text. The log has
 /// it, too. AdapterError passes through.
+/// @param subject  what the log calls the adapter: "adapter 0000:05:00.0"
 template <typename Action>
-bool runReporting(const std::string& adapter, std::uint32_t& errorCode, std::string& errorText,
+bool runReporting(const std::string& subject, std::uint32_t& errorCode, std::string& errorText,
                   Action action) {
     errorCode = WriteError::NoError;
     errorText.clear();
@@ -37,7 +38,7 @@ bool runReporting(const std::string& adapter, std::uint32_t& errorCode, std::str
         errorCode = WriteError::DeviceFailed;
         errorText = error.what();
     }
-    QUENX_ERROR("adapter %s: %s", adapter.c_str(), errorText.c_str());
+    QUENX_ERROR("%s: %s", subject.c_str(), errorText.c_str());
     return false;
 }
 

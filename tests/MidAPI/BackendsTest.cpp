@@ -2,16 +2,23 @@
 #include "MidAPI/Backends.h"
 
 #include <gtest/gtest.h>
+#include <sched.h>
+#include <sys/mount.h>
 #include <unistd.h>
 
 #include <cstdlib>
 #include <filesystem>
 #include <fstream>
+#include <map>
 
+#include "MidAPI/ma.h"
+#include "Support/Program.h"
 #include "Support/SimulatedAdapters.h"
 #include "Support/TestRoms.h"
 
 namespace {
+
+constexpr const char* kPciDevices = "/sys/bus/pci/devices";
 
 /// These variables, and no others of those that choose adapters, until the end of the scope. No backend is
 /// chosen at first.
@@ -48,6 +55,18 @@ bool installsOnEth0() {
     return test::writeImage("eth0", prepared.image).done;
 }
 
+/// Puts folders of the test's own in the place of the system's, for this process alone.
+void standInForTheSystem(const test::TempFolder& root) {
+    const bool isAlone =
+        ::unshare(CLONE_NEWNS) == 0 && ::mount(nullptr, "/", nullptr, MS_REC | MS_PRIVATE, nullptr) == 0;
+    if (!isAlone) ::_exit(2);
+    for (const char* folder : {"/etc", "/var/lib", kPciDevices}) {
+        const std::string own = root.path() + folder;
+        std::filesystem::create_directories(own);
+        if (::mount(own.c_str(), folder, nullptr, MS_BIND, nullptr) != 0) ::_exit(2);
+    }
+}
+
 /// What is in use after the choice: what it says of its search, or the error.
 std::string searchOf(const ma::BackendChoice& choice) try {
     ma::selectBackend(choice);
@@ -76,6 +95,7 @@ TEST(BackendsTest, AreChosenByWhatIsSaidThenByTheEnvironment) {
          {},
          "QUENX_BACKEND: there is no backend \"simulation\"; it must be "},
         {{}, {.backend = "simulation"}, "there is no backend \"simulation\"; it must be "},
+        {{{"QUENX_BACKEND", "devlink"}}, {.description = five}, five + ", which describes 5."},
         // What was meant to name simulated adapters never leads to real ones.
         {{{"QUENX_ADAPTERS", ""}}, {}, "QUENX_ADAPTERS: it is empty; "},
         {{{"QUENX_ADAPTERS", missing}}, {}, "QUENX_ADAPTERS: there is no adapter description " + missing},
@@ -84,6 +104,8 @@ TEST(BackendsTest, AreChosenByWhatIsSaidThenByTheEnvironment) {
         {{{"QUENX_ADAPTER_STATE", ""}}, {.description = five}, "QUENX_ADAPTER_STATE: it is empty; "},
         {{{"QUENX_ADAPTERS", five}}, {.description = missing}, "there is no adapter description " + missing},
         {{}, {.description = ""}, "there is no adapter description "},
+        {{{"QUENX_BACKEND", "devlink"}, {"QUENX_ADAPTERS", five}}, {}, "QUENX_ADAPTERS: simulated adapters "},
+        {{}, {.backend = "devlink", .description = five}, "simulated adapters are described in " + five},
     };
     for (const auto& [variables, choice, expected] : table) {
         const ChoosingVariables chosen(variables);
@@ -106,6 +128,32 @@ TEST(BackendsTest, StayUntilTheNextOneIsThere) {
     EXPECT_TRUE(installsOnEth0());
     EXPECT_EQ("IMG_PXE 9, IMG_UEFI 0", test::describeRom(adapters->flashContent("eth0")))
         << "the state is that of the variable";
+}
+
+TEST(BackendsTest, AreThoseOfTheSystemWhereNothingIsSaid) {
+    const bool canMount =
+        test::run({"/usr/bin/unshare", "-m", "/bin/mount", "--bind", kPciDevices, kPciDevices}).status == 0;
+    if (!canMount) GTEST_SKIP() << "nothing can be mounted";
+    const test::TempFolder root;
+    const auto answers = [&root] {
+        standInForTheSystem(root);
+        const ChoosingVariables none({});
+        const bool isEmpty = ma::enumerateAdapters().empty();
+        std::ofstream("/etc/quenx-adapters.toml") << test::kTestAdapters;
+        ma::setBackend(nullptr);
+        const bool isSimulated =
+            installsOnEth0() && std::filesystem::exists("/var/lib/quenx/adapters/eth0/state");
+        // A forgotten description hides no card; one that is named is what is wanted.
+        const std::string function = kPciDevices + std::string("/0000:05:00.0");
+        std::filesystem::create_directory(function);
+        std::ofstream(function + "/class") << "0x020000\n";
+        ma::setBackend(nullptr);
+        const bool isReal = ma::enumerateAdapters() == utils::StringArray{"0000:05:00.0"};
+        ::setenv("QUENX_ADAPTERS", "/etc/quenx-adapters.toml", 1);
+        ma::setBackend(nullptr);
+        return isEmpty && isSimulated && isReal && ma::enumerateAdapters().size() == 5;
+    };
+    EXPECT_EXIT(::_exit(answers() ? 0 : 1), testing::ExitedWithCode(0), "");
 }
 
 TEST(BackendsTest, AnswersUntilTheProcessHasEnded) {

@@ -114,7 +114,7 @@ std::vector<SettingsField> otherFields(Settings& s) {
             {"providers.configuration", &s.providerConfiguration, 0, 0,
              "the providers' own configuration file, instead of /etc/quenx-cimprovider.conf"},
             {"adapters.backend", &s.backend, 1, 0,
-             "which adapters: simulator, or auto for those that there are; instead of QUENX_BACKEND"},
+             "which adapters: devlink for this machine's own, simulator or auto; instead of QUENX_BACKEND"},
             {"adapters.description", &s.adapters, 1, 0,
              "file that describes simulated adapters, instead of /etc/quenx-adapters.toml"},
             {"adapters.state", &s.adapterState, 1, 0,

@@ -10,6 +10,7 @@
 #include "MidAPI/Devlink/FlashRun.h"
 #include "MidAPI/Devlink/StagedImage.h"
 #include "MidAPI/Image/Bytes.h"
+#include "MidAPI/Image/ImageBuffers.h"
 #include "MidAPI/Image/ImagePreparation.h"
 #include "MidAPI/OperationFailure.h"
 #include "Utils/Log.h"
@@ -84,23 +85,21 @@ int DevlinkBackend::prepareFlashImage(const std::string& adapter, const std::uin
                                       std::uint32_t fileSize, std::uint8_t* output, std::uint32_t* imageSize,
                                       std::vector<utils::FirmwareType>& types) try {
     const auto known = m_table.find(adapter);
-    const bool buffersMissing = fileSize != 0 && (file == nullptr || output == nullptr);
-    if (!known || buffersMissing || imageSize == nullptr || *imageSize < fileSize) {
+    const auto buffers = ImageBuffers::of(file, fileSize, output, imageSize);
+    if (!known || !buffers) {
         QUENX_ERROR("adapter %s: status %d: %s", adapter.c_str(), PrepareStatus::InvalidParameter,
                     known ? "a buffer is missing or too small" : "there is no such adapter");
         return PrepareStatus::InvalidParameter;
     }
     known->progress->prepared();
-    const std::span<const std::uint8_t> bytes(file, fileSize);
-    const PackageVerdict verdict = assess(*known, bytes, types);
+    const PackageVerdict verdict = assess(*known, buffers->file, types);
     if (!verdict.reason.empty())
         QUENX_ERROR("adapter %s: status %d: %s", adapter.c_str(), verdict.status, verdict.reason.c_str());
     if (!hasOutput(verdict.status)) return verdict.status;
-    std::copy(bytes.begin(), bytes.end(), output);
-    *imageSize = fileSize;
+    *imageSize = buffers->copyFile();
     types = verdict.types;
     const utils::Mutex::AutoLocker lock(m_preparedMutex);
-    m_prepared[adapter] = {fileSize, crc32(bytes), verdict.components};
+    m_prepared[adapter] = {fileSize, crc32(buffers->file), verdict.components};
     return verdict.status;
 } catch (const std::exception& error) {
     QUENX_ERROR("adapter %s: status %d: %s", adapter.c_str(), PrepareStatus::UnspecifiedError, error.what());
@@ -138,7 +137,7 @@ bool DevlinkBackend::accepts(const KnownFunction& known, const std::string& comp
 bool DevlinkBackend::writeFlashImage(const std::string& adapter, const std::uint8_t* image,
                                      std::uint32_t imageSize, std::uint32_t& errorCode,
                                      std::string& errorText) {
-    return runReporting(adapter, errorCode, errorText, [&] {
+    return runReporting("adapter " + adapter, errorCode, errorText, [&] {
         write(adapter, {image, image == nullptr ? 0 : imageSize});
     });
 }
@@ -180,7 +179,7 @@ std::vector<std::string> DevlinkBackend::preparedComponents(const std::string& a
 
 bool DevlinkBackend::updateCapabilityWord(const std::string& adapter, const std::vector<utils::FirmwareType>&,
                                           std::uint32_t& errorCode, std::string& errorText) {
-    return runReporting(adapter, errorCode, errorText, [&] {
+    return runReporting("adapter " + adapter, errorCode, errorText, [&] {
         const auto known = m_table.find(adapter);
         if (!known || known->flash.flashable == Flashable::Absent)
             throw OperationFailure(ENODEV, "adapter " + adapter + " is gone");
@@ -207,15 +206,30 @@ AdapterInfo DevlinkBackend::getAdapterInfo(const std::string& adapter) {
     info.linkUp = state.linkUp;
     info.ids = known.pci.ids;
     info.components = m_settings.components.installed(known.info.versions);
-    info.backend = "devlink";
+    info.backend = kDevlinkBackend;
     info.driver = known.pci.driver;
     info.serialNumber = known.info.serialNumber;
     info.boardSerialNumber = known.info.boardSerialNumber;
     info.versions = known.info.versions;
+    for (NamedVersion& version : info.versions)
+        version.type = m_settings.components.typeOf(version.name);
     info.resetNeeded = resetNeeded(known.info);
     info.interfaces = known.pci.interfaces;
     info.description = "Ethernet adapter " + known.pci.address;
     return info;
+}
+
+std::string DevlinkBackend::describeSearch() {
+    const utils::StringArray names = m_table.names();
+    std::string text = "Ethernet adapters were looked for on PCI (class 0200 in /sys/bus/pci/devices): " +
+                       std::to_string(names.size()) + (names.size() == 1 ? " was found." : " were found.");
+    for (const std::string& name : names) {
+        const auto known = m_table.find(name);
+        if (!known || known->flash.flashable == Flashable::Yes) continue;
+        text += " " + name + " (" + (known->pci.driver.empty() ? "no driver" : known->pci.driver) +
+                ") cannot be updated: " + known->flash.reason + ".";
+    }
+    return text;
 }
 
 }  // namespace ma::devlink

@@ -44,6 +44,7 @@ class QUENX_EXPORT DevlinkBackend : public Backend {
     /// Devlink knows no boot protocols: does nothing, and says so by false.
     bool setBootType(const std::string& adapter, BootType type) override;
     AdapterInfo getAdapterInfo(const std::string& adapter) override;
+    std::string describeSearch() override;
 
   private:
     /// What was prepared last for an adapter: the write is only told the bytes.

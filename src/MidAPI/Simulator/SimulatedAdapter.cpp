@@ -194,7 +194,7 @@ void SimulatedAdapter::requireWritable(std::span<const std::uint8_t> image) cons
 
 bool SimulatedAdapter::write(std::span<const std::uint8_t> image, std::uint32_t& errorCode,
                              std::string& errorText) {
-    return runReporting(m_description.name, errorCode, errorText, [&] {
+    return runReporting("simulated adapter " + m_description.name, errorCode, errorText, [&] {
         // What can be refused without the lock is: a second writer then reads what is wrong, not "busy".
         requireWritable(image);
         const os::FileLock lock = m_store.lockForWriting();
@@ -232,7 +232,7 @@ void SimulatedAdapter::writeLocked(std::span<const std::uint8_t> image) {
 
 bool SimulatedAdapter::updateCapabilityWord(const std::vector<utils::FirmwareType>& types,
                                             std::uint32_t& errorCode, std::string& errorText) {
-    return runReporting(m_description.name, errorCode, errorText, [&] {
+    return runReporting("simulated adapter " + m_description.name, errorCode, errorText, [&] {
         FaultRun(m_faults, Operation::CapabilityWord).reach();
         std::uint32_t wanted = 0;
         for (const utils::FirmwareType type : types)
@@ -247,7 +247,7 @@ bool SimulatedAdapter::updateCapabilityWord(const std::vector<utils::FirmwareTyp
 bool SimulatedAdapter::setBootType(BootType type) {
     std::uint32_t errorCode = 0;
     std::string errorText;
-    return runReporting(m_description.name, errorCode, errorText, [&] {
+    return runReporting("simulated adapter " + m_description.name, errorCode, errorText, [&] {
         FaultRun(m_faults, Operation::BootType).reach();
         m_store.changeState([type](FlashState& state) { state.bootType = static_cast<std::uint32_t>(type); });
     });

@@ -80,6 +80,11 @@ TEST(DevlinkInventoryTest, SaysWhatCanBeUpdatedAndPreparesNothingElse) {
         const test::DevlinkBench bench;
         each.arrange(*bench.kernel, bench.device());
         EXPECT_EQ(each.canBeUpdated, ma::getCanBeUpdated(bench.first)) << each.log;
+        const std::string search = ma::describeSearch();
+        EXPECT_NE(std::string::npos, search.find(": 2 were found.")) << search;
+        EXPECT_EQ(each.canBeUpdated,
+                  search.find(bench.first + " (fake) cannot be updated: ") == std::string::npos)
+            << search;
         EXPECT_EQ(each.status, bench.prepare()) << each.log;
         EXPECT_TRUE(each.log.empty() || log.contains(each.log)) << each.log;
         EXPECT_EQ(2U, ma::enumerateAdapters().size()) << each.log;
