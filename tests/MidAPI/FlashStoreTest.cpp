@@ -178,6 +178,18 @@ TEST_F(FlashStoreTest, ClosesItsFilesToOtherUsers) {
     EXPECT_EQ(modeOf(path("")), 0700U);
     EXPECT_EQ(modeOf(path("state.lock")), 0600U);
 
+    // Whoever owns the folder around it, or may write there, could exchange it.
+    const std::string around = m_adapters.stateDirectory();
+    const auto isWritten = [] { return test::writeImage("eth0", test::madeRom({{PXE, 3}})).done; };
+    ASSERT_EQ(::chmod(around.c_str(), 0777), 0);
+    EXPECT_FALSE(isWritten());
+    ASSERT_EQ(::chmod(around.c_str(), 01777), 0);
+    EXPECT_TRUE(isWritten());
+    if (::chown(around.c_str(), 1, 1) == 0) {
+        EXPECT_FALSE(isWritten());
+        ASSERT_EQ(::chown(around.c_str(), 0, 0), 0);
+    }
+
     fs::rename(path(""), m_adapters.folder() / "elsewhere");
     fs::create_symlink(m_adapters.folder() / "elsewhere", m_adapters.stateDirectory() + "/eth0");
     EXPECT_EQ(test::writeImage("eth0", test::madeRom({{PXE, 4}})).code, ma::WriteError::DeviceFailed);

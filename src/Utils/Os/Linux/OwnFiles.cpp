@@ -34,6 +34,17 @@ int aboveStandard(int descriptor) noexcept {
     return copy;
 }
 
+/// Whoever owns the folder around ours, or may write to it where no sticky bit protects what is others', can
+/// put another one in its place.
+void requireSafePlace(const Descriptor& folder, const std::string& path, const std::string& purpose) {
+    struct stat status {};
+    if (::fstatat(folder.number(), "..", &status, 0) != 0) fail(errno, purpose + " " + path);
+    const std::string place = path + "/..";
+    if (status.st_uid != ::geteuid() && status.st_uid != 0) throw ForeignFile(place, status.st_uid, purpose);
+    if ((status.st_mode & S_IWOTH) != 0 && (status.st_mode & S_ISVTX) == 0)
+        fail(EPERM, purpose + " " + path + ": everybody may exchange it; run: chmod o-w " + place);
+}
+
 }  // namespace
 
 ForeignFile::ForeignFile(const std::string& path, uid_t owner, const std::string& purpose)
@@ -72,6 +83,7 @@ bool closeFolderToOthers(const std::string& path) {
     struct stat status {};
     if (folder.number() < 0 || ::fstat(folder.number(), &status) != 0) fail(errno, purpose + " " + path);
     if (status.st_uid != ::geteuid()) throw ForeignFile(path, status.st_uid, purpose);
+    requireSafePlace(folder, path, purpose);
     if (!closeToOthers(folder.number())) fail(errno, "cannot protect the folder " + path);
     return true;
 }
