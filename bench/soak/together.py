@@ -4,13 +4,15 @@
 
     bench/soak/together.py [--seconds N] [--seed TEXT] [--build FOLDER]
 
-The build has to have quenx-cimd, quenxctl, the providers and FlashStarter. A seed repeats what is chosen, but not how
-processes and threads meet. Nothing is touched but a temporary folder and loopback.
+The build has to have quenx-cimd, quenxctl, the providers and FlashStarter. A copy of it is what runs, so it may be built
+again meanwhile. A seed repeats what is chosen, but not how processes and threads meet. Nothing is touched but a
+temporary folder and loopback.
 """
 import argparse
 import os
 import pathlib
 import random
+import shutil
 import signal
 import sys
 import tempfile
@@ -50,11 +52,19 @@ def guarded(name, work):
     return threading.Thread(target=run)
 
 
+def copy_of(build, folder):
+    shutil.copytree(build / "lib", folder / "lib")
+    (folder / "bin").mkdir()
+    for program in ("quenx-cimd", "quenxctl"):
+        shutil.copy(build / "bin" / program, folder / "bin")
+    return folder
+
+
 def threads_for(options, folder, over):
     def dice(name):
         return random.Random(f"{options.seed} {name}")
 
-    build = options.build.resolve()
+    build = copy_of(options.build, folder / "build")
     images = {folder / f"images/{n}.rom": flash.make_image(dice(f"image {n}"), n) for n in range(1, 7)}
     for name in ("images", "host"):
         (folder / name).mkdir()

@@ -285,9 +285,8 @@ TEST(DaemonTest, RunsWhereItIsInstalledAndKeepsWhatIsConfigured) {
 TEST(DaemonTest, NamesWhatKeepsItFromServing) {
     const test::TempFolder folder;
     folder.write("libQuenx_Broken.so", "no library");
-    for (const char* name : {"libQuenx_SoftwareUpdate.so", "libQuenx_SoftwareInventory.so"}) {
-        std::filesystem::create_symlink(std::filesystem::path(QUENX_LIBRARIES) / name, folder / name);
-    }
+    for (const auto& library : std::filesystem::directory_iterator(QUENX_LIBRARIES))
+        std::filesystem::create_symlink(library.path(), folder / library.path().filename().string());
     RunningDaemon daemon({"--providers-directory", folder.path()});
     EXPECT_EQ(daemon.lines("ein", "Quenx_EthernetPort").size(), 5U);
     EXPECT_TRUE(contains(daemon.program().seen(), "libQuenx_Broken.so: ")) << daemon.program().seen();
