@@ -2,9 +2,12 @@
 #pragma once
 
 #include <cstdint>
+#include <optional>
+#include <span>
 #include <string>
 #include <vector>
 
+#include "MidAPI/Activation.h"
 #include "MidAPI/AdapterTypes.h"
 #include "Utils/Export.h"
 #include "Utils/FirmwareTypes.h"
@@ -39,6 +42,13 @@ class QUENX_EXPORT Backend {
     virtual bool setBootType(const std::string& adapter, BootType type) = 0;
     virtual AdapterInfo getAdapterInfo(const std::string& adapter) = 0;
     virtual std::string describeSearch();
+
+    // These a backend need not offer.
+    virtual std::optional<ImageVerdict> judgeImage(const std::string& adapter,
+                                                   std::span<const std::uint8_t> file,
+                                                   const std::vector<utils::FirmwareType>& types);
+    virtual CardUse getCardUse(const std::string& adapter, const std::string& caller);
+    virtual Activation activate(const std::string& adapter, const ActivationRequest& request);
 };
 
 }  // namespace ma

@@ -49,6 +49,19 @@ std::string Backend::describeSearch() {
     return {};
 }
 
+std::optional<ImageVerdict> Backend::judgeImage(const std::string&, std::span<const std::uint8_t>,
+                                                const std::vector<utils::FirmwareType>&) {
+    return std::nullopt;
+}
+
+CardUse Backend::getCardUse(const std::string&, const std::string&) {
+    return {};
+}
+
+Activation Backend::activate(const std::string&, const ActivationRequest&) {
+    return {Activation::NotOffered, ""};
+}
+
 utils::StringArray enumerateAdapters() {
     return backend()->enumerateAdapters();
 }
@@ -91,6 +104,19 @@ bool setBootType(std::string adapter, BootType type) {
 
 AdapterInfo getAdapterInfo(std::string adapter) {
     return backend()->getAdapterInfo(adapter);
+}
+
+std::optional<ImageVerdict> judgeImage(std::string adapter, std::span<const std::uint8_t> file,
+                                       const std::vector<utils::FirmwareType>& types) {
+    return backend()->judgeImage(adapter, file, types);
+}
+
+CardUse getCardUse(std::string adapter, const std::string& caller) {
+    return backend()->getCardUse(adapter, caller);
+}
+
+Activation activate(std::string adapter, const ActivationRequest& request) {
+    return backend()->activate(adapter, request);
 }
 
 void selectBackend(const BackendChoice& choice) {

@@ -3,9 +3,12 @@
 
 #include <cstdint>
 #include <memory>
+#include <optional>
+#include <span>
 #include <string>
 #include <vector>
 
+#include "MidAPI/Activation.h"
 #include "MidAPI/AdapterTypes.h"
 #include "Utils/Export.h"
 #include "Utils/FirmwareTypes.h"
@@ -72,6 +75,24 @@ QUENX_EXPORT bool setBootType(std::string adapter, BootType type);
 
 /// Everything else that is known of a port. Throws AdapterError for an unknown name or an unreadable adapter.
 QUENX_EXPORT AdapterInfo getAdapterInfo(std::string adapter);
+
+/// What prepareFlashImage() would answer, in words, and what could not be checked; changes nothing. Nothing
+/// from a backend whose images every caller can read, see assessImage(). Throws AdapterError for an unknown
+/// name.
+/// @param types  as there
+QUENX_EXPORT std::optional<ImageVerdict> judgeImage(std::string adapter, std::span<const std::uint8_t> file,
+                                                    const std::vector<utils::FirmwareType>& types);
+
+/// What stands and falls with the card of a port; nothing where the backend cannot tell. Throws AdapterError
+/// for an unknown name.
+/// @param caller  the network address of who asks, whose connection may run over the card; empty for somebody
+///                at the machine
+QUENX_EXPORT CardUse getCardUse(std::string adapter, const std::string& caller);
+
+/// Puts the firmware in force that is in the port's flash, which resets the card: never done but by this call.
+/// Blocks until the card's interfaces are back, or have been waited for. Throws AdapterError for an unknown
+/// name.
+QUENX_EXPORT Activation activate(std::string adapter, const ActivationRequest& request);
 
 /// Selects the backend: for programs that have options or settings for it. Throws AdapterError, which names
 /// what is wrong (in a description also the line) and what would be right; the backend in use then stays.

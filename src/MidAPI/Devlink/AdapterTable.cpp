@@ -5,6 +5,7 @@
 
 #include <system_error>
 
+#include "MidAPI/Devlink/Activator.h"
 #include "MidAPI/Devlink/CardLock.h"
 #include "Utils/Log.h"
 
@@ -83,6 +84,7 @@ void AdapterTable::ask(const std::string& name, const Found& found) {
         QUENX_ERROR("adapter %s: %s", name.c_str(), known.flash.reason.c_str());
     entry->second.known.flash = known.flash;
     entry->second.known.info = known.info;
+    entry->second.known.offersActivation = known.offersActivation;
     // What was told in between may be newer than the answers.
     const bool isKnown = known.flash.flashable != Flashable::Unknown;
     if (isKnown && entry->second.changes == found.changes) entry->second.isOutOfDate = false;
@@ -98,6 +100,7 @@ void AdapterTable::askDevice(KnownFunction& known) try {
     const Answer info = askInfo(connection, known.pci.address);
     // A driver need not tell anything of its device.
     if (!info.isLost && info.result.error == 0) known.info = readDeviceInfo(info.attributes);
+    known.offersActivation = offersActivation(connection, known.pci.address);
 } catch (const std::system_error& failure) {
     known.flash = {Flashable::Unknown, failure.what()};
 }

@@ -22,7 +22,8 @@ struct KnownFunction {
     PciFunction pci;
     FlashVerdict flash;  ///< Flashable::Unknown also until the device could be asked
     DeviceInfo info;
-    bool isBusy = false;  ///< it is being flashed, by this process or another one
+    bool offersActivation = false;  ///< the driver can put new firmware in force while the machine runs
+    bool isBusy = false;            ///< it is being flashed, by this process or another one
     std::shared_ptr<Progress> progress = std::make_shared<Progress>();  ///< never null
 };
 

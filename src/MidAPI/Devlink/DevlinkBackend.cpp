@@ -5,15 +5,18 @@
 #include <cerrno>
 #include <system_error>
 
+#include "MidAPI/Devlink/Activator.h"
 #include "MidAPI/Devlink/CardLock.h"
 #include "MidAPI/Devlink/DeviceRequests.h"
 #include "MidAPI/Devlink/FlashRun.h"
+#include "MidAPI/Devlink/NetworkUse.h"
 #include "MidAPI/Devlink/StagedImage.h"
 #include "MidAPI/Image/Bytes.h"
 #include "MidAPI/Image/ImageBuffers.h"
 #include "MidAPI/Image/ImagePreparation.h"
 #include "MidAPI/OperationFailure.h"
 #include "Utils/Log.h"
+#include "Utils/Utils.h"
 
 namespace ma::devlink {
 namespace {
@@ -43,10 +46,21 @@ void requireFlashable(const FlashVerdict& flash) {
                                    (flash.reason.empty() ? "; it is busy, try again" : ": " + flash.reason));
 }
 
-/// A firmware that is in the flash and does not run yet. Only a try would tell what it takes to make it run.
-ResetNeeded resetNeeded(const DeviceInfo& info) {
-    return std::ranges::any_of(info.versions, &NamedVersion::isPending) ? ResetNeeded::Unknown
-                                                                        : ResetNeeded::None;
+/// What it takes to run what is in the flash. Where the driver cannot activate it, nothing tells whether a
+/// restart does or a power cycle; and where it does not tell what is in the flash, nothing tells anything.
+ResetNeeded resetNeeded(const KnownFunction& known) {
+    const std::vector<NamedVersion>& versions = known.info.versions;
+    if (std::ranges::any_of(versions, &NamedVersion::isPending))
+        return known.offersActivation ? ResetNeeded::Reload : ResetNeeded::Unknown;
+    const auto isTold = [](const NamedVersion& version) { return !version.stored.empty(); };
+    return std::ranges::any_of(versions, isTold) ? ResetNeeded::None : ResetNeeded::Unknown;
+}
+
+/// By the places on the bus, or by what the board says of itself.
+bool areOnOneCard(const KnownFunction& left, const KnownFunction& right) {
+    const auto isSame = [](const std::string& a, const std::string& b) { return !a.empty() && a == b; };
+    return left.pci.card() == right.pci.card() || isSame(left.info.serialNumber, right.info.serialNumber) ||
+           isSame(left.info.boardSerialNumber, right.info.boardSerialNumber);
 }
 
 }  // namespace
@@ -213,7 +227,7 @@ AdapterInfo DevlinkBackend::getAdapterInfo(const std::string& adapter) {
     info.versions = known.info.versions;
     for (NamedVersion& version : info.versions)
         version.type = m_settings.components.typeOf(version.name);
-    info.resetNeeded = resetNeeded(known.info);
+    info.resetNeeded = resetNeeded(known);
     info.interfaces = known.pci.interfaces;
     info.description = "Ethernet adapter " + known.pci.address;
     return info;
@@ -230,6 +244,45 @@ std::string DevlinkBackend::describeSearch() {
                 ") cannot be updated: " + known->flash.reason + ".";
     }
     return text;
+}
+
+std::optional<ImageVerdict> DevlinkBackend::judgeImage(const std::string& adapter,
+                                                       std::span<const std::uint8_t> file,
+                                                       const std::vector<utils::FirmwareType>& types) {
+    const KnownFunction known = require(adapter);
+    try {
+        return assess(known, file, types);
+    } catch (const std::exception& error) {
+        return ImageVerdict{.status = PrepareStatus::UnspecifiedError, .reason = error.what()};
+    }
+}
+
+CardUse DevlinkBackend::getCardUse(const std::string& adapter, const std::string& caller) {
+    const KnownFunction known = require(adapter);
+    CardUse use;
+    for (const std::string& name : m_table.names()) {
+        const auto each = m_table.find(name);
+        if (!each || !areOnOneCard(known, *each)) continue;
+        use.functions.push_back(name);
+        use.interfaces.insert(use.interfaces.end(), each->pci.interfaces.begin(), each->pci.interfaces.end());
+    }
+    findNetworkUse(*m_machine, caller, use);
+    return use;
+}
+
+Activation DevlinkBackend::activate(const std::string& adapter, const ActivationRequest& request) try {
+    const KnownFunction known = require(adapter);
+    const CardUse use = getCardUse(adapter, request.caller);
+    if (!request.mayDisrupt && !use.losses.empty())
+        return {Activation::WouldDisrupt, utils::joined(use.losses, "; ")};
+    if (known.flash.flashable == Flashable::NotPermitted) return {Activation::Failed, known.flash.reason};
+    const CardLock lock(*m_machine, kLockFolder, known.pci, known.info, kLockPatience);
+    if (!lock.isHeld()) return {Activation::Failed, "the card is being written to by " + lock.holder()};
+    // The device answers nothing meanwhile, and has to be asked anew afterwards.
+    const AdapterTable::FlashScope resetting(m_table, adapter);
+    return activateDevice(*m_machine, adapter, use.functions);
+} catch (const std::system_error& error) {
+    return {Activation::Failed, error.what()};
 }
 
 }  // namespace ma::devlink

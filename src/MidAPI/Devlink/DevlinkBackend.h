@@ -4,6 +4,7 @@
 #include <cstdint>
 #include <map>
 #include <memory>
+#include <optional>
 #include <span>
 #include <string>
 #include <vector>
@@ -45,6 +46,10 @@ class QUENX_EXPORT DevlinkBackend : public Backend {
     bool setBootType(const std::string& adapter, BootType type) override;
     AdapterInfo getAdapterInfo(const std::string& adapter) override;
     std::string describeSearch() override;
+    std::optional<ImageVerdict> judgeImage(const std::string& adapter, std::span<const std::uint8_t> file,
+                                           const std::vector<utils::FirmwareType>& types) override;
+    CardUse getCardUse(const std::string& adapter, const std::string& caller) override;
+    Activation activate(const std::string& adapter, const ActivationRequest& request) override;
 
   private:
     /// What was prepared last for an adapter: the write is only told the bytes.

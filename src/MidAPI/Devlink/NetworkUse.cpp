@@ -5,6 +5,7 @@
 #include <set>
 
 #include "MidAPI/Devlink/Machine.h"
+#include "MidAPI/Devlink/PciFunctions.h"
 #include "MidAPI/Devlink/Routes.h"
 #include "Utils/Utils.h"
 
@@ -69,8 +70,10 @@ bool hasLink(Machine& machine, const std::string& interface) {
     return machine.readFile(netFolder(interface) + "/carrier") == "1";
 }
 
-utils::StringArray interfacesOf(Machine& machine, const std::string& function) {
-    return machine.listFolder("/sys/bus/pci/devices/" + function + "/net");
+/// The function's own interfaces: those that stand for virtual functions come and go with these.
+utils::StringArray interfacesOf(const std::vector<PciFunction>& functions, const std::string& address) {
+    const auto found = std::ranges::find(functions, address, &PciFunction::address);
+    return found == functions.end() ? utils::StringArray() : found->interfaces;
 }
 
 }  // namespace
@@ -86,17 +89,19 @@ void findNetworkUse(Machine& machine, const std::string& caller, CardUse& use) {
 }
 
 std::vector<LinkState> linksOf(Machine& machine, const utils::StringArray& functions) {
+    const std::vector<PciFunction> all = findPciFunctions(machine);
     std::vector<LinkState> links;
     for (const std::string& function : functions)
-        for (const std::string& interface : interfacesOf(machine, function))
+        for (const std::string& interface : interfacesOf(all, function))
             links.push_back({function, interface, hasLink(machine, interface)});
     return links;
 }
 
 utils::StringArray missingLinks(Machine& machine, const std::vector<LinkState>& before) {
+    const std::vector<PciFunction> all = findPciFunctions(machine);
     utils::StringArray missing;
     for (const LinkState& link : before) {
-        const utils::StringArray now = interfacesOf(machine, link.function);
+        const utils::StringArray now = interfacesOf(all, link.function);
         const bool hasName = std::ranges::find(now, link.interface) != now.end();
         // An interface may have come back under another name; then any of the function's will do.
         const auto isUp = [&machine](const std::string& interface) { return hasLink(machine, interface); };

@@ -117,6 +117,7 @@ std::string FakeKernel::lockPath(const std::string& path) const {
 }
 
 std::optional<std::string> FakeKernel::readFile(const std::string& path) {
+    if (reading) reading(path);
     const std::lock_guard lock(m_mutex);
     if (path.ends_with(".lock")) return ma::devlink::LinuxMachine().readFile(lockPath(path));
     const auto file = files.find(path);
@@ -251,10 +252,13 @@ std::recursive_mutex& FakeKernel::lockOf(const std::string& address) {
 void FakeKernel::handle(int socket, const Request& request) {
     const std::lock_guard lock(lockOf(request.texts.at(DEVLINK_ATTR_DEV_NAME)));
     const bool isFlash = request.command == DEVLINK_CMD_FLASH_UPDATE;
-    if (isFlash && !isPermitted) return acknowledge(socket, request, EPERM);
+    const bool isReset = request.command == DEVLINK_CMD_RELOAD;
+    if ((isFlash || isReset) && !isPermitted) return acknowledge(socket, request, EPERM);
     const auto device = devices.find(request.texts.at(DEVLINK_ATTR_DEV_NAME));
     if (device == devices.end()) return acknowledge(socket, request, ENODEV);
     if (isFlash) return flash(socket, request, device->second);
+    if (isReset) return reset(socket, request, device->second);
+    if (request.command == DEVLINK_CMD_GET) return tellDevice(socket, request, device->second);
     tellInfo(socket, request, device->second);
 }
 
@@ -275,6 +279,37 @@ void FakeKernel::tellInfo(int socket, const Request& request, const FakeDevice& 
     versions(DEVLINK_ATTR_INFO_VERSION_STORED, device.stored);
     answer(socket, familyMessage(kFamily, request.command, request.sequence, content));
     acknowledge(socket, request, 0);
+}
+
+// Of the resets that others have caused the kernel lists every kind, whether the driver offers it or not.
+void FakeKernel::tellDevice(int socket, const Request& request, const FakeDevice& device) {
+    const auto counts = [](std::uint8_t action) {
+        return Writer()
+            .attribute(DEVLINK_ATTR_RELOAD_ACTION_INFO | NLA_F_NESTED,
+                       Writer().value(DEVLINK_ATTR_RELOAD_ACTION, action).take())
+            .take();
+    };
+    const auto offered = static_cast<std::uint8_t>(
+        device.offersActivation ? DEVLINK_RELOAD_ACTION_FW_ACTIVATE : DEVLINK_RELOAD_ACTION_DRIVER_REINIT);
+    Writer content;
+    content.attribute(DEVLINK_ATTR_DEV_STATS | NLA_F_NESTED,
+                      Writer()
+                          .attribute(DEVLINK_ATTR_RELOAD_STATS | NLA_F_NESTED, counts(offered))
+                          .attribute(DEVLINK_ATTR_REMOTE_RELOAD_STATS | NLA_F_NESTED,
+                                     counts(DEVLINK_RELOAD_ACTION_FW_ACTIVATE))
+                          .take());
+    answer(socket, familyMessage(kFamily, DEVLINK_CMD_NEW, request.sequence, content));
+    acknowledge(socket, request, 0);
+}
+
+void FakeKernel::reset(int socket, const Request& request, FakeDevice& device) {
+    const std::string action(1, static_cast<char>(DEVLINK_RELOAD_ACTION_FW_ACTIVATE));
+    if (!device.offersActivation || request.texts.at(DEVLINK_ATTR_RELOAD_ACTION) != action)
+        return acknowledge(socket, request, EOPNOTSUPP,
+                           "Requested reload action is not supported by the driver");
+    if (device.duringReset) device.duringReset();
+    if (device.activationError == 0) device.running = device.stored;
+    acknowledge(socket, request, device.activationError);
 }
 
 // The order of the refusals is the kernel's.

@@ -40,6 +40,10 @@ struct FakeDevice {
     bool tellsEnd = true;
     bool isAcknowledged = true;
     std::function<void()> duringFlash;  ///< called with the device's lock held, after the statuses
+
+    bool offersActivation = false;
+    int activationError = 0;  ///< how the driver ends a reset, errno value
+    std::function<void()> duringReset;
 };
 
 /// A machine of a test's own: files in memory, and a kernel that answers devlink on the other end of each
@@ -58,7 +62,8 @@ class FakeKernel : public ma::devlink::Machine {
     std::map<std::string, FakeDevice> devices;  ///< by address
     bool hasDevlink = true;
     bool isPermitted = true;
-    std::function<void(Datagram&)> mangle;  ///< changes what the kernel answers
+    std::function<void(const std::string&)> reading;  ///< called before a file is read
+    std::function<void(Datagram&)> mangle;            ///< changes what the kernel answers
 
     int requests = 0;                       ///< that were about a device
     std::vector<std::string> flashed;       ///< "COMPONENT:CONTENT" of each flash, in order
@@ -102,6 +107,8 @@ class FakeKernel : public ma::devlink::Machine {
     void handle(int socket, const Request& request);
     void resolveFamily(int socket, const Request& request);
     void tellInfo(int socket, const Request& request, const FakeDevice& device);
+    void tellDevice(int socket, const Request& request, const FakeDevice& device);
+    void reset(int socket, const Request& request, FakeDevice& device);
     void flash(int socket, const Request& request, FakeDevice& device);
     void acknowledge(int socket, const Request& request, int error, const std::string& text = "",
                      std::uint16_t attribute = 0, std::uint32_t value = 0);

@@ -6,7 +6,7 @@
 #include <algorithm>
 
 #include "MidAPI/Devlink/Caller.h"
-#include "MidAPI/Devlink/MachineInMemory.h"
+#include "MidAPI/Devlink/FakeKernel.h"
 #include "MidAPI/Devlink/NetworkUse.h"
 #include "Utils/Utils.h"
 
@@ -35,7 +35,7 @@ class NetworkUseTest : public ::testing::Test {
   protected:
     /// Puts `upper` on `lower`.
     void stack(const std::string& upper, const std::string& lower) {
-        m_machine.links["/sys/class/net/" + lower + "/upper_" + upper] = "";
+        m_machine.folders.insert("/sys/class/net/" + lower + "/upper_" + upper);
     }
     void bond(const std::string& name, const Names& slaves, const std::string& down = "") {
         m_machine.files["/sys/class/net/" + name + "/bonding/slaves"] = utils::joined(slaves, " ");
@@ -54,7 +54,7 @@ class NetworkUseTest : public ::testing::Test {
         return found;
     }
 
-    test::MachineInMemory m_machine;
+    test::FakeKernel m_machine;
     std::string m_routesV4 =
         "Iface\tDestination\tGateway \tFlags\tRefCnt\tUse\tMetric\tMask\tMTU\tWindow\tIRTT\n";
     std::string m_routesV6;
@@ -107,27 +107,32 @@ TEST_F(NetworkUseTest, FindsTheConnectionOfWhoAsks) {
 }
 
 TEST_F(NetworkUseTest, TellsWhichLinksHaveNotComeBack) {
-    const auto put = [this](const std::string& function, const std::string& interface, bool isUp) {
-        m_machine.links["/sys/bus/pci/devices/" + function + "/net/" + interface] = "";
+    const auto put = [this](const std::string& number, const std::string& interface, bool isUp) {
+        m_machine.add("0000:0" + number + ":00.0", interface);
         if (isUp) m_machine.files["/sys/class/net/" + interface + "/carrier"] = "1";
     };
-    for (const auto& [function, interface] :
-         {std::pair("1", "eth1"), {"2", "eth2"}, {"3", "eth3"}, {"4", "eth4"}})
-        put(function, interface, function != std::string("4"));
-    const auto before = ma::devlink::linksOf(m_machine, {"1", "2", "3", "4", "5"});
+    Names functions;
+    for (const std::string number : {"1", "2", "3", "4"}) {
+        put(number, "eth" + number, number != "4");
+        functions.push_back("0000:0" + number + ":00.0");
+    }
+    // Of the card's switch, not the function's own.
+    put("1", "eth1_0", true);
+    m_machine.files["/sys/class/net/eth1_0/phys_port_name"] = "pf0vf0";
+    const auto before = ma::devlink::linksOf(m_machine, functions);
     EXPECT_EQ(4U, before.size());
     EXPECT_THAT(ma::devlink::missingLinks(m_machine, before), IsEmpty());
-    m_machine.links.clear();
+    m_machine.folders.clear();
     m_machine.files.clear();
     put("1", "eth1", false);
     put("2", "renamed", true);
     put("4", "eth4", false);
     EXPECT_THAT(ma::devlink::missingLinks(m_machine, before),
-                ElementsAre("eth1 has no link", "3 has no network interface (before: eth3)"));
+                ElementsAre("eth1 has no link", "0000:03:00.0 has no network interface (before: eth3)"));
 }
 
 TEST(CallerTest, IsWhoLoggedInToAnAncestor) {
-    test::MachineInMemory machine;
+    test::FakeKernel machine;
     machine.files = {{"/proc/self/environ", "A=1"},
                      {"/proc/self/status", "Name:\tx\nPPid:\t7\nUid:\t0"},
                      {"/proc/7/status", "PPid:\t1"},

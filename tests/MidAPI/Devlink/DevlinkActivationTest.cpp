@@ -1,0 +1,114 @@
+// SPDX-License-Identifier: Apache-2.0
+// Putting new firmware in force, and what is looked at before and after.
+#include <gmock/gmock.h>
+
+#include <linux/devlink.h>
+
+#include <cerrno>
+
+#include "MidAPI/Devlink/DevlinkBench.h"
+
+namespace {
+
+using ::testing::ElementsAre;
+using ::testing::HasSubstr;
+
+/// A card that has been updated and offers activation, whose first interface has a link and the default
+/// route.
+class DevlinkActivationTest : public ::testing::Test {
+  protected:
+    DevlinkActivationTest() {
+        device().offersActivation = true;
+        device().stored["fw"] = "1.3.0";
+        putLink(true);
+    }
+    test::FakeDevice& device() const { return m_bench.device(); }
+    void putLink(bool isUp) const {
+        m_bench.kernel->files["/sys/class/net/enp5s0f0/carrier"] = isUp ? "1" : "0";
+    }
+    void putDefaultRoute() const {
+        m_bench.kernel->files["/proc/net/route"] = "enp5s0f0 00000000 00000000 0003 0 0 0 00000000 0 0 0";
+    }
+    ma::Activation activate(const ma::ActivationRequest& request = {}) const {
+        return ma::activate(m_bench.first, request);
+    }
+    ma::ResetNeeded resetNeeded() const { return ma::getAdapterInfo(m_bench.first).resetNeeded; }
+
+    const test::DevlinkBench m_bench;
+};
+
+TEST_F(DevlinkActivationTest, ResetsTheCardAndReadsItAnew) {
+    EXPECT_EQ(ma::ResetNeeded::Reload, resetNeeded());
+    device().duringReset = [this] {
+        putLink(false);
+        // It is agreed on only while it is waited for.
+        m_bench.kernel->reading = [this, looks = 0](const std::string& path) mutable {
+            if (path.ends_with("enp5s0f0/carrier") && ++looks == 3) putLink(true);
+        };
+    };
+    const ma::Activation activation = activate();
+    EXPECT_EQ(ma::Activation::Done, activation.status) << activation.text;
+    EXPECT_EQ("1.3.0", ma::getAdapterInfo(m_bench.first).versions.at(0).running);
+    EXPECT_EQ(ma::ResetNeeded::None, resetNeeded());
+}
+
+TEST_F(DevlinkActivationTest, RefusesToCutTheMachineOffUnlessTold) {
+    putDefaultRoute();
+    const ma::CardUse use = ma::getCardUse(m_bench.second, "");
+    EXPECT_THAT(use.functions, ElementsAre(m_bench.first, m_bench.second));
+    EXPECT_THAT(use.interfaces, ElementsAre("enp5s0f0", "enp5s0f1"));
+    // The other function is reset, too.
+    const ma::Activation refused = ma::activate(m_bench.second, {});
+    EXPECT_EQ(ma::Activation::WouldDisrupt, refused.status);
+    EXPECT_EQ("the default route goes through enp5s0f0", refused.text);
+    EXPECT_EQ("1.2.3", device().running["fw"]);
+    EXPECT_EQ(ma::Activation::Done, activate({.mayDisrupt = true}).status);
+}
+
+TEST_F(DevlinkActivationTest, TellsWhatHasNotComeBack) {
+    device().duringReset = [this] { putLink(false); };
+    const ma::Activation activation = activate();
+    EXPECT_EQ(ma::Activation::NotBack, activation.status);
+    EXPECT_EQ("enp5s0f0 has no link", activation.text);
+}
+
+TEST_F(DevlinkActivationTest, TellsWhyNothingWasActivated) {
+    device().activationError = EIO;
+    device().duringReset = [this] { m_bench.kernel->folders.clear(); };
+    const ma::Activation failed = activate();
+    EXPECT_EQ(ma::Activation::Failed, failed.status);
+    EXPECT_THAT(failed.text, HasSubstr("Input/output error; 0000:05:00.0 has no network interface"));
+
+    device().offersActivation = false;
+    m_bench.kernel->notify(DEVLINK_CMD_NEW, m_bench.first);
+    EXPECT_EQ(ma::ResetNeeded::Unknown, resetNeeded());
+    const ma::Activation none = activate();
+    EXPECT_EQ(ma::Activation::NotOffered, none.status);
+    EXPECT_THAT(none.text, HasSubstr("Requested reload action is not supported by the driver"));
+
+    auto lock = m_bench.kernel->lock("/var/lib/quenx/locks/0000:05:00.lock", {});
+    EXPECT_THAT(activate().text, HasSubstr("is being written to by this process"));
+    lock.reset();
+    m_bench.kernel->isPermitted = false;
+    EXPECT_THAT(activate().text, HasSubstr("run it as root"));
+    EXPECT_THROW(ma::activate("0000:09:00.0", {}), ma::AdapterError);
+}
+
+TEST_F(DevlinkActivationTest, IsNotToldApartFromARestartWhereTheDriverTellsNothing) {
+    device().stored.clear();
+    EXPECT_EQ(ma::ResetNeeded::Unknown, resetNeeded());
+}
+
+TEST_F(DevlinkActivationTest, LeavesTheJudgementOfImagesToTheDriver) {
+    const auto verdict = ma::judgeImage(m_bench.first, m_bench.image, {});
+    ASSERT_TRUE(verdict);
+    EXPECT_EQ(ma::Prepared, verdict->status);
+    EXPECT_EQ(3U, verdict->unchecked.size());
+    EXPECT_EQ(ma::InvalidParameter, ma::judgeImage(m_bench.first, {}, {})->status);
+    m_bench.kernel->readOnly.insert("/lib/firmware");
+    const auto hindered = ma::judgeImage(m_bench.first, m_bench.image, {});
+    EXPECT_EQ(ma::UnspecifiedError, hindered->status);
+    EXPECT_THAT(hindered->reason, HasSubstr("may not write to any of"));
+}
+
+}  // namespace
