@@ -23,7 +23,8 @@ constexpr const char* kFooter =
     "  3  already current: what was to be installed is what is installed (see --force)\n"
     "  4  not found: there is no such adapter, image file, identity, job, class or instance\n"
     "  5  unknown: the update may have begun, or may still be running; the message says where to look\n"
-    "  6  interrupted: before the update began, or while a server goes on with it; the message says which\n";
+    "  6  interrupted: before the update began, or while a server goes on with it; the message says which\n"
+    "  7  a reset is pending: what \"adapters --pending\" lists has new firmware that does not run yet\n";
 
 /// An option, or without dashes an argument, that takes one value.
 template <class Value>
@@ -89,10 +90,14 @@ std::vector<std::string> typesOf(std::string text) {
     return types;
 }
 
-/// What install and check have in common. Returns the option for an identity, which says its types itself.
-CLI::Option* addUpdateOptions(CLI::App& verb, UpdateOptions& options, const char* imageText) {
+void addTarget(CLI::App& verb, UpdateOptions& options) {
     addValue(verb, "--target", options.target, "ADAPTER", "Adapter: its name, PCI address or object path")
         ->required();
+}
+
+/// What install and check have in common. Returns the option for an identity, which says its types itself.
+CLI::Option* addUpdateOptions(CLI::App& verb, UpdateOptions& options, const char* imageText) {
+    addTarget(verb, options);
     addValue(verb, "image", options.image, "URI", imageText);
     CLI::Option* identity = addValue(verb, "--identity", options.identity, "ID",
                                      "Image: a software identity that \"identities\" lists");
@@ -131,6 +136,13 @@ void addImageVerbs(CLI::App& app, Arguments& arguments) {
     verb->add_flag("--force", options.force,
                    "Also install an older image, the same one again, or one with other image types");
     verb->footer("An update that has begun always runs to its end: Ctrl-C does not stop it.");
+
+    verb = addVerb(app, arguments, "activate", activate,
+                   "Have an adapter run the firmware in its flash, by a reset of its card");
+    addTarget(*verb, options);
+    verb->add_flag("--disrupt", arguments.options.mayDisrupt,
+                   "Also where that cuts the machine, or you, off from the network for a moment");
+    verb->footer("Only on the machine itself, without --server. Never done by itself after an update.");
 }
 
 /// A verb that looks around an instance. Whatever its result, the list can be of paths alone.
@@ -161,7 +173,11 @@ void addModelVerbs(CLI::App& app, Arguments& arguments) {
 
 /// In the order in which the help lists them.
 void addVerbs(CLI::App& app, Arguments& arguments) {
-    addVerb(app, arguments, "adapters", showAdapters, "List the adapters and the firmware on them");
+    CLI::App* adapters =
+        addVerb(app, arguments, "adapters", showAdapters, "List the adapters and the firmware on them");
+    adapters->add_flag("--pending", arguments.options.pendingOnly,
+                       "List only those whose new firmware waits for a reset; the exit status tells whether "
+                       "there are any");
     addVerb(app, arguments, "identities", showIdentities,
             "List the images that the inventory offers, and those installed");
     addImageVerbs(app, arguments);
@@ -276,6 +292,13 @@ void requireOneImage(const CLI::App& app, const Arguments& arguments) {
                        askHelpOf(*app.get_subcommands().front()));
 }
 
+/// Who resets a card has to be where its network is.
+void requireOwnMachine(const Arguments& arguments) {
+    if (arguments.verb == activate && arguments.server.url)
+        throw CommandError(ExitStatus::WrongUse, "\"activate\" cannot be used with --server.",
+                           "Run it on the machine that has the adapter.");
+}
+
 /// Jobs are kept by a server: where no other is named, the one of this machine, if it is there for this user.
 void chooseServer(Arguments& arguments) {
     const ProviderSettings& own = arguments.providers;
@@ -333,6 +356,7 @@ std::optional<Arguments> readArguments(int argc, char** argv) {
         return std::nullopt;
     }
     requireOneImage(app, arguments);
+    requireOwnMachine(arguments);
     chooseServer(arguments);
     return arguments;
 }

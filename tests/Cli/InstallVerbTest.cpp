@@ -7,6 +7,8 @@
 
 #include "Cli/Verbs/Verbs.h"
 #include "Framework/Requests/CimRequests.h"
+#include "MidAPI/Simulator/Simulator.h"
+#include "MidAPI/ma.h"
 #include "Support/TempFolder.h"
 #include "Support/TestRoms.h"
 
@@ -55,6 +57,8 @@ class FakeService : public core::CimRequests {
     bool hasMemory = true;
     std::string jobNamespace;
     bool isReadable = true;  ///< what is installed, after the job
+    std::string resetNeeded = "None";
+    std::uint32_t refusal = 0;  ///< what the service answers in place of a job
 
     FakeService() : CimRequests("") {}
     Instances enumerateInstances(const std::string& className, const PropertyFilter&) override {
@@ -62,8 +66,8 @@ class FakeService : public core::CimRequests {
         if (className != "Quenx_EthernetPort") return {};
         return {{CimPath("Quenx_EthernetPort.DeviceID=\"eth0\""),
                  {{"Name", CimValue::of(CimType::String, std::string("eth0")), false, {}},
-                  texts("OtherIdentifyingInfo", {"1af4:1041"}),
-                  texts("IdentifyingDescriptions", {"PCI Vendor and Device ID"})}}};
+                  texts("OtherIdentifyingInfo", {"1af4:1041", resetNeeded}),
+                  texts("IdentifyingDescriptions", {"PCI Vendor and Device ID", "Reset Needed"})}}};
     }
     std::vector<CimPath> enumerateInstanceNames(const std::string& className) override {
         return {CimPath(className + ".Name=\"1\"")};
@@ -85,6 +89,7 @@ class FakeService : public core::CimRequests {
     core::MethodResult invokeMethod(const CimPath&, const std::string&,
                                     const std::vector<core::Argument>&) override {
         isCalled = true;
+        if (refusal != 0) return {refusal, {}};
         if (!answersTheCall) throw cli::NoAnswer(ExitStatus::Failed, "No answer.", "Wait.");
         if (!hasMemory) throw std::bad_alloc();
         if (!needsJob) installed = installedAfterJob;
@@ -95,10 +100,36 @@ class FakeService : public core::CimRequests {
     }
 };
 
+/// A card whose backend alone knows the format of its images, and that takes a reset to run them.
+class CardStub : public ma::Simulator {
+  public:
+    CardStub() : Simulator(std::vector<ma::AdapterDescription>{}, "") {}
+
+    ma::ImageVerdict verdict;
+    ma::ResetNeeded needed = ma::ResetNeeded::Reload;
+    ma::Activation activation;
+    bool mayDisrupt = false;  ///< as it was asked for
+
+    std::optional<ma::ImageVerdict> judgeImage(const std::string&, std::span<const std::uint8_t>,
+                                               const std::vector<utils::FirmwareType>&) override {
+        return verdict;
+    }
+    ma::AdapterInfo getAdapterInfo(const std::string&) override { return {.resetNeeded = needed}; }
+    ma::CardUse getCardUse(const std::string&, const std::string&) override {
+        return {.functions = {"eth0", "eth1"}, .interfaces = {"enp1s0"}, .bridges = {"br0"}};
+    }
+    ma::Activation activate(const std::string&, const ma::ActivationRequest& request) override {
+        mayDisrupt = request.mayDisrupt;
+        return activation;
+    }
+};
+constexpr const char* kCard =
+    "On this card:\n  functions   eth0, eth1\n  interfaces  enp1s0\n  bridges     br0\n";
+
 class InstallVerbTest : public ::testing::Test {
   protected:
     /// Forgets what the last run printed, and runs it.
-    ExitStatus run(cli::Verb verb, bool isInProcess) {
+    ExitStatus run(cli::Verb verb, bool isInProcess = true) {
         for (std::ostringstream* stream : {&m_out, &m_error, &m_lines})
             stream->str("");
         const cli::Connection connection{
@@ -113,6 +144,7 @@ class InstallVerbTest : public ::testing::Test {
             .progress = progress,
             .following = {.pause = [] {}, .interrupted = [this] { return m_isInterrupted; }}};
         cli::VerbOptions options;
+        options.mayDisrupt = m_mayDisrupt;
         options.update.target = "eth0";
         options.update.image = m_file;
         return verb(context, options);
@@ -127,6 +159,16 @@ class InstallVerbTest : public ::testing::Test {
     std::ostringstream m_error;
     std::ostringstream m_lines;
     bool m_isInterrupted = false;
+    bool m_mayDisrupt = false;
+};
+
+class CardVerbTest : public InstallVerbTest {
+  protected:
+    CardVerbTest() : m_previous(ma::setBackend(m_card)) {}
+    ~CardVerbTest() override { ma::setBackend(m_previous); }
+
+    const std::shared_ptr<CardStub> m_card = std::make_shared<CardStub>();
+    const std::shared_ptr<ma::Backend> m_previous;
 };
 
 TEST_F(InstallVerbTest, FollowsTheJobOverABrokenConnection) {
@@ -248,6 +290,60 @@ TEST_F(InstallVerbTest, ListsWhoseJobsTheyAreWhereTheServiceSays) {
               "JOB  ADAPTER  STATE     PERCENT  START  USER  ERROR\n"
               "     -        Starting  0        -      -     \n"
               "     -        Running   40       -      ann   \n");
+}
+
+TEST_F(CardVerbTest, TellsOfTheCardBeforeAndOfTheResetAfterAnUpdate) {
+    m_service->resetNeeded = "Reload";
+    m_service->installedAfterJob = kOld;
+    m_card->verdict.unchecked = {"which card the file is for"};
+    EXPECT_EQ(install(), ExitStatus::Done);
+    const std::string unchecked =
+        "It could not be checked which card the file is for. The adapter judges that when the image is "
+        "written.\n";
+    EXPECT_EQ(m_out.str(), unchecked + kCard +
+                               "eth0 was updated.\n  IMG_PXE   1 (unchanged)\n  IMG_UEFI  0 (unchanged)\n"
+                               "It takes effect after a reset: \"quenxctl activate --target eth0\" does that "
+                               "while the machine runs.\n");
+    EXPECT_EQ(run([](cli::Context& context, const cli::VerbOptions&) {
+                  cli::VerbOptions pending;
+                  pending.pendingOnly = true;
+                  return cli::showAdapters(context, pending);
+              }),
+              ExitStatus::ResetPending);
+    EXPECT_EQ(m_out.str(), "NAME  RESET   FIRMWARE\neth0  reload  IMG_PXE 1, IMG_UEFI 0\n");
+}
+
+TEST_F(CardVerbTest, RefusesAnImageInTheWordsOfItsBackend) {
+    m_service->refusal = 4097;
+    m_card->verdict = {ma::ImageNotSupported, "the package is for PCI device 8086:1592"};
+    EXPECT_EQ(install(), ExitStatus::Failed);
+    EXPECT_EQ(m_error.str(), "quenxctl: eth0 does not take " + m_file +
+                                 ": the package is for PCI device 8086:1592.\nGet the image made for "
+                                 "1af4:1041.\n");
+}
+
+TEST_F(CardVerbTest, ActivatesWhatWaitsAndTellsHowThatEnded) {
+    using enum ma::Activation::Status;
+    m_mayDisrupt = true;
+    const std::tuple<ma::Activation, ExitStatus, std::string> table[] = {
+        {{Done, ""}, ExitStatus::Done, "eth0 runs the firmware in its flash.\n"},
+        {{NotOffered, ""}, ExitStatus::Failed, "eth0 cannot be activated while the machine runs.\nRestart"},
+        {{WouldDisrupt, "the default route goes through br0"},
+         ExitStatus::Failed,
+         "would cut the network: the default route goes through br0.\n"},
+        {{Failed, "Input/output error"}, ExitStatus::Failed, "of eth0 failed: Input/output error.\n"},
+        {{NotBack, "enp1s0 has no link"}, ExitStatus::Unknown, "all there again: enp1s0 has no link.\n"},
+    };
+    for (const auto& [activation, status, said] : table) {
+        m_card->activation = activation;
+        EXPECT_EQ(run(cli::activate), status);
+        EXPECT_TRUE(m_out.str().starts_with(kCard));
+        EXPECT_NE((m_out.str() + m_error.str()).find(said), std::string::npos) << m_error.str();
+    }
+    EXPECT_TRUE(m_card->mayDisrupt);
+    m_card->needed = ma::ResetNeeded::None;
+    m_card->activation = {Failed, "not to be asked for"};
+    EXPECT_EQ(run(cli::activate), ExitStatus::AlreadyCurrent);
 }
 
 }  // namespace

@@ -22,6 +22,7 @@ enum class ExitStatus {
     NotFound = 4,        ///< what the command line names is not there: an adapter, a job, an image file
     Unknown = 5,         ///< whether an update began, or how it ended, cannot be told
     Interrupted = 6,     ///< by the user; an update that a server has begun goes on
+    ResetPending = 7,    ///< adapters have firmware that waits for a reset
 };
 
 /// The advice where the program knows no better.

@@ -6,9 +6,12 @@
 #include <algorithm>
 #include <cerrno>
 #include <filesystem>
+#include <functional>
+#include <span>
 #include <system_error>
 
 #include "MidAPI/Image/ImagePreparation.h"
+#include "MidAPI/ma.h"
 #include "Utils/Os/Linux/linux.h"
 #include "Utils/Utils.h"
 
@@ -59,7 +62,9 @@ bool carries(const ma::RomImage& image, const std::string& type) {
 }
 
 /// Reads the file. Never waits: only a regular file is opened. Never throws on account of the file.
-ImageFile readImage(const std::string& path) try {
+/// @param isJudged  given the content of a file that can be an image; true when no more is to be read of it
+ImageFile readImage(const std::string& path,
+                    const std::function<bool(std::span<const std::uint8_t>)>& isJudged) try {
     ImageFile image{path, std::nullopt, {}};
     struct stat info = {};
     if (stat(path.c_str(), &info) != 0) throw std::system_error(errno, std::generic_category());
@@ -71,6 +76,7 @@ ImageFile readImage(const std::string& path) try {
     // If the file has gone since stat(), nothing can be read.
     const std::optional<std::vector<std::uint8_t>> content = os::readWholeFile(path, kLargestRead);
     if (!content) throw std::system_error(ENOENT, std::generic_category());
+    if (isJudged(*content)) return image;
     image.rom = ma::parseOptionRom(*content);
     if (image.rom.error)
         image.problem = notAnImage(path, "is not a complete firmware image: " + *image.rom.error);
@@ -79,13 +85,16 @@ ImageFile readImage(const std::string& path) try {
     return {path, cannotRead(path, error.code().value()), {}};
 }
 
+std::vector<utils::FirmwareType> typesOf(const std::vector<std::string>& names) {
+    std::vector<utils::FirmwareType> types;
+    for (const std::string& name : names)
+        if (const auto type = ma::firmwareTypeFromName(name)) types.push_back(*type);
+    return types;
+}
+
 /// The images that are written for these types. @param types  as ma::assessImage() takes them, by name
 ma::RomFile chosenOf(const ma::RomFile& rom, const std::vector<std::string>& types) {
-    std::vector<utils::FirmwareType> requested;
-    for (const std::string& type : types) {
-        if (const auto known = ma::firmwareTypeFromName(type)) requested.push_back(*known);
-    }
-    return ma::chooseImages(rom, std::move(requested));
+    return ma::chooseImages(rom, typesOf(types));
 }
 
 /// Another PXE image would take the one with the CLP entry point away, so the same version is not the same.
@@ -137,8 +146,12 @@ Candidate compared(const Connection& connection, Candidate candidate) {
     // If the service runs on another machine, the same path may name another file.
     const std::optional<std::string> path = localPath(candidate.uri);
     if (!path || !connection.sharesFiles) return candidate;
-    candidate.image = readImage(*path);
-    if (!candidate.image->problem)
+    candidate.image = readImage(*path, [&](std::span<const std::uint8_t> content) {
+        if (connection.isInProcess)
+            candidate.verdict = ma::judgeImage(candidate.adapter.name, content, typesOf(candidate.types));
+        return candidate.verdict.has_value();
+    });
+    if (!candidate.image->problem && !candidate.verdict)
         candidate.comparison = compare(candidate.image->rom, candidate.adapter, candidate.types);
     return candidate;
 }

@@ -8,6 +8,7 @@
 #include <vector>
 
 #include "Cli/Update/Inventory.h"
+#include "MidAPI/AdapterTypes.h"
 #include "MidAPI/Image/OptionRom.h"
 
 namespace cli {
@@ -60,6 +61,8 @@ struct Candidate {
     bool force = false;                   ///< the service is told to install what is older, too
     std::optional<ImageFile> image = {};  ///< only when the URI names a file that this program sees, too
     std::optional<Comparison> comparison = {};  ///< only with an intact image
+    /// What the adapter's backend says of the file, where the backend alone knows its format.
+    std::optional<ma::ImageVerdict> verdict = {};
 
     /// True when installing would change nothing, as far as versions tell.
     bool isAlreadyCurrent() const;

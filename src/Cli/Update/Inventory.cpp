@@ -160,14 +160,18 @@ std::vector<Component> readComponents(core::CimOperations& operations, const cor
 
 namespace {
 
+std::string resetNeededOf(const core::InstanceValue& port) {
+    const std::string reset = identifyingText(port, "Reset Needed");
+    return reset.empty() ? "none" : utils::lowerCase(reset);
+}
+
 void readMore(Adapter& adapter, const core::InstanceValue& port) {
     adapter.backend = backendOf(port);
     adapter.driver = identifyingText(port, "Driver");
     adapter.serialNumber = identifyingText(port, "Serial Number");
     adapter.boardSerialNumber = identifyingText(port, "Board Serial Number");
     adapter.interfaces = identifyingTexts(port, "Network Interface");
-    const std::string reset = identifyingText(port, "Reset Needed");
-    adapter.resetNeeded = reset.empty() ? "none" : utils::lowerCase(reset);
+    adapter.resetNeeded = resetNeededOf(port);
 }
 
 }  // namespace
@@ -188,8 +192,19 @@ std::vector<Adapter> readAdapters(core::CimOperations& operations) {
     return adapters;
 }
 
+std::string readResetNeeded(core::CimOperations& operations, const core::CimPath& port) {
+    for (const core::InstanceValue& each : operations.enumerateInstances("Quenx_EthernetPort"))
+        if (each.path.isSameObjectAs(port)) return resetNeededOf(each);
+    return "unknown";
+}
+
 std::string backendOf(const core::InstanceValue& port) {
     return identifyingText(port, "Adapter Backend");
+}
+
+bool Adapter::waitsForReset() const {
+    return std::ranges::any_of(components, [](const Component& each) { return !each.stored.empty(); }) ||
+           (resetNeeded != "none" && resetNeeded != "unknown");
 }
 
 std::string adviceForSilence(const Connection& connection) {

@@ -52,6 +52,9 @@ struct Adapter {
     std::string boardSerialNumber = {};
     std::vector<std::string> interfaces = {};
     std::string resetNeeded = {};  ///< "none", "reload", "reboot", "power cycle", "unknown"
+
+    /// It has new firmware that does not run yet; false where the adapter does not tell.
+    bool waitsForReset() const;
 };
 void to_json(nlohmann::ordered_json& json, const Adapter& adapter);
 
@@ -63,6 +66,9 @@ std::vector<Adapter> readAdapters(core::CimOperations& operations);
 
 /// What is installed on a port.
 std::vector<Component> readComponents(core::CimOperations& operations, const core::CimPath& port);
+
+/// What a port waits for after an update: Adapter::resetNeeded.
+std::string readResetNeeded(core::CimOperations& operations, const core::CimPath& port);
 
 /// What to do about adapters that do not answer.
 std::string adviceForSilence(const Connection& connection);

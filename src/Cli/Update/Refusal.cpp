@@ -204,7 +204,26 @@ Reason explainNotApplicable(const Candidate& candidate) {
                        "It has " + joined(types) + "."};
 }
 
+/// In the words of the backend, which alone knows the format.
+Reason explainVerdict(const Candidate& candidate) {
+    const ma::ImageVerdict& verdict = *candidate.verdict;
+    if (verdict.reason.empty()) return std::nullopt;
+    const std::string message = candidate.adapter.name + " does not take " + candidate.image->path + ": " +
+                                verdict.reason + (verdict.reason.ends_with('.') ? "" : ".");
+    switch (verdict.status) {
+        case ma::PrepareStatus::InvalidParameter:
+            return Explanation{message, "Name a complete firmware image."};
+        case ma::PrepareStatus::ImageNotSupported:
+            return Explanation{message, candidate.adapter.updatable ? getImageFor(candidate.adapter) : ""};
+        case ma::PrepareStatus::ImageIsOlder:
+            return Explanation{message, "Use a newer image, or install this one with --force."};
+        default:
+            return Explanation{message, ""};
+    }
+}
+
 Reason explainImage(const Connection& connection, std::uint32_t returnValue, const Candidate& candidate) {
+    if (candidate.verdict) return explainVerdict(candidate);
     switch (returnValue) {
         case MethodReturn::UnspecifiedError:
             if (candidate.adapter.answers) return explainFile(candidate);
@@ -260,7 +279,9 @@ Explanation explainFailedJob(const Connection& connection, const JobView& job, c
                              const std::vector<Component>& after) {
     const std::string reason = job.errorDescription.empty() ? "no reason was given" : job.errorDescription;
     std::string next = readBackText(candidate, after);
-    const std::string advice = connection.isInProcess ? permissionAdvice(reason) : "";
+    // Of its own format a backend says itself what it takes.
+    const bool mayBeFiles = connection.isInProcess && !candidate.verdict;
+    const std::string advice = mayBeFiles ? permissionAdvice(reason) : "";
     if (!next.empty() && !advice.empty()) next += ' ';
     return {"The update of " + candidate.adapter.name + " failed: " + reason + " (error " +
                 std::to_string(job.errorCode) + ").",

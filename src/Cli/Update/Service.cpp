@@ -90,6 +90,10 @@ struct ServiceCall {
 
 }  // namespace
 
+void auditOwn(const std::string& operation, const std::string& target, const std::string& outcome) {
+    core::audit({localUser(), "local", operation, target, outcome});
+}
+
 core::MethodResult startUpdate(const Connection& connection, const Candidate& candidate) {
     using core::CimType;
     using core::CimValue;

@@ -27,6 +27,9 @@ core::CimPath jobOf(const core::CimOperations& operations, const core::MethodRes
 /// for that.
 std::optional<std::uint32_t> verifyOnly(const Connection& connection, const Candidate& candidate);
 
+/// Leaves the audit line of a change that this process makes by itself, without the service.
+void auditOwn(const std::string& operation, const std::string& target, const std::string& outcome);
+
 /// Why the service refused the candidate: what the program finds in the file, on the adapter and among the
 /// service's jobs that explains the return value, else what the value means.
 Explanation explainRefusal(const Connection& connection, std::uint32_t returnValue,

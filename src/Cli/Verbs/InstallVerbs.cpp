@@ -3,6 +3,7 @@
 #include <algorithm>
 
 #include "Cli/Display/Output.h"
+#include "Cli/Update/Card.h"
 #include "Cli/Update/Service.h"
 #include "Cli/Verbs/Verbs.h"
 
@@ -17,6 +18,8 @@ struct Outcome {
           label(labelOf(candidate.adapter.name, candidate.adapter.backend)),
           backend(candidate.adapter.backend),
           uri(candidate.uri),
+          unchecked(candidate.verdict ? candidate.verdict->unchecked : std::vector<std::string>()),
+          resetNeeded(candidate.adapter.resetNeeded),
           before(candidate.adapter.components),
           after(before) {}
 
@@ -42,6 +45,8 @@ struct Outcome {
     std::string uri;
     std::optional<std::uint32_t> returnValue;  ///< of the method, when it was called
     std::optional<JobView> job;                ///< when one was started
+    std::vector<std::string> unchecked;        ///< what only the write can show
+    std::string resetNeeded;                   ///< by what was written, as the model tells it
     std::vector<Component> before;
     std::vector<Component> after;  ///< as before until something is written; empty if it cannot be read
 };
@@ -56,6 +61,8 @@ void to_json(Json& json, const Outcome& outcome) {
             {"uri", outcome.uri},
             {"returnValue", nullptr},
             {"job", nullptr},
+            {"unchecked", outcome.unchecked},
+            {"resetNeeded", outcome.resetNeeded},
             {"before", outcome.before},
             {"after", outcome.after}};
     if (outcome.returnValue) json["returnValue"] = *outcome.returnValue;
@@ -85,6 +92,12 @@ void printChange(std::ostream& out, const Outcome& outcome) {
     printTable(out, rows);
 }
 
+void printUnchecked(std::ostream& out, const Outcome& outcome) {
+    if (outcome.unchecked.empty()) return;
+    out << "It could not be checked " << printable(joined(outcome.unchecked, "; "))
+        << ". The adapter judges that when the image is written.\n";
+}
+
 ExitStatus print(Context& context, const Outcome& outcome) {
     if (context.json) {
         printJson(context.out, outcome);
@@ -94,6 +107,7 @@ ExitStatus print(Context& context, const Outcome& outcome) {
     stream << (outcome.isFailure() ? "quenxctl: " : "") << printable(outcome.message) << '\n';
     // After a failure the explanation says what the adapter has now.
     if (outcome.result == "updated") printChange(stream, outcome);
+    if (outcome.result == "installable") printUnchecked(stream, outcome);
     if (!outcome.advice.empty()) stream << printable(outcome.advice) << '\n';
     return outcome.status;
 }
@@ -125,17 +139,19 @@ void judgeCompleted(Outcome& outcome, const Candidate& candidate) {
                     outcome.label + (wasCurrent ? " was rewritten with the same version." : " was updated."));
         if (outcome.after.empty() && !outcome.before.empty())
             outcome.advice = "Its versions cannot be read now; \"quenxctl adapters\" shows them later.";
+        else
+            outcome.advice = resetAdvice(name, outcome.resetNeeded);
     }
 }
 
-/// What the adapter carries after the update. Nothing where that cannot be read: how the job ended is still
-/// worth reporting.
-std::vector<Component> readBack(core::CimOperations& operations, const Candidate& candidate) {
-    try {
-        return readComponents(operations, candidate.adapter.path);
-    } catch (const std::exception&) {
-        return {};
-    }
+/// What the adapter carries after the update, and what it waits for. Nothing where that cannot be read: how
+/// the job ended is still worth reporting.
+void readBack(core::CimOperations& operations, const Candidate& candidate, Outcome& outcome) try {
+    outcome.after.clear();
+    outcome.after = readComponents(operations, candidate.adapter.path);
+    outcome.resetNeeded = readResetNeeded(operations, candidate.adapter.path);
+} catch (const std::exception&) {
+    // What was read so far stays.
 }
 
 /// The update is under way, or may be, and this program no longer sees it: nor what the adapter has now.
@@ -162,7 +178,7 @@ void followUpdate(Context& context, const core::CimPath& job, const Candidate& c
     }
     outcome.job->adapter = outcome.adapter;
     outcome.job->backend = outcome.backend;
-    outcome.after = readBack(operations, candidate);
+    readBack(operations, candidate, outcome);
     if (outcome.job->hasSucceeded()) {
         judgeCompleted(outcome, candidate);
     } else {
@@ -178,7 +194,7 @@ ExitStatus conclude(Context& context, const core::MethodResult& result, const Ca
         followUpdate(context, jobOf(*context.connection.operations, result), candidate, outcome);
     } else if (result.returnValue == MethodReturn::Completed) {
         // Other services may be done by the time they answer, and then name no job.
-        outcome.after = readBack(*context.connection.operations, candidate);
+        readBack(*context.connection.operations, candidate, outcome);
         judgeCompleted(outcome, candidate);
     } else {
         outcome.end("refused", explainRefusal(context.connection, result.returnValue, candidate));
@@ -222,6 +238,10 @@ ExitStatus installUnlessInterrupted(Context& context, const UpdateOptions& optio
         outcome.advice = "Use --force to write it again.";
         context.following.over();
         return print(context, outcome);
+    }
+    if (!context.json) {
+        printUnchecked(context.out, outcome);
+        printCard(context.out, readCard(context.connection, outcome.adapter));
     }
     // The last moment to stop: once the service is called, nobody can.
     if (context.following.interrupted()) throw CommandError(ExitStatus::Interrupted, "Interrupted.", "");

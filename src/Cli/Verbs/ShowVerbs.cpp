@@ -76,10 +76,29 @@ ExitStatus showAround(Context& context, const VerbOptions& options, List list, L
     }
 }
 
+ExitStatus showPending(Context& context, std::vector<Adapter> adapters) {
+    std::erase_if(adapters, [](const Adapter& adapter) { return !adapter.waitsForReset(); });
+    const ExitStatus status = adapters.empty() ? ExitStatus::Done : ExitStatus::ResetPending;
+    if (context.json) {
+        printJson(context.out, {{"adapters", adapters}});
+        return status;
+    }
+    if (adapters.empty()) {
+        context.out << "No adapter waits for a reset.\n";
+        return status;
+    }
+    std::vector<std::vector<std::string>> rows = {{"NAME", "RESET", "FIRMWARE"}};
+    for (const Adapter& adapter : adapters)
+        rows.push_back({adapter.name, adapter.resetNeeded, componentsText(adapter.components)});
+    printTable(context.out, rows);
+    return status;
+}
+
 }  // namespace
 
-ExitStatus showAdapters(Context& context, const VerbOptions&) {
-    const std::vector<Adapter> adapters = readAdapters(*context.connection.operations);
+ExitStatus showAdapters(Context& context, const VerbOptions& options) {
+    std::vector<Adapter> adapters = readAdapters(*context.connection.operations);
+    if (options.pendingOnly) return showPending(context, std::move(adapters));
     if (context.json) {
         printJson(context.out, {{"adapters", adapters}, {"search", searchText(context.connection)}});
         return ExitStatus::Done;

@@ -26,12 +26,14 @@ struct Context {
 
 /// The options and arguments of all verbs; each verb looks at its own.
 struct VerbOptions {
-    UpdateOptions update;            ///< install, check
+    UpdateOptions update;            ///< install, check; of activate the target
     std::string job;                 ///< delete: its id, the number at the end of that, or its path
     std::string className;           ///< instances
     std::string path;                ///< associators, references
     core::AssociationFilter filter;  ///< associators, references
     bool namesOnly = false;          ///< instances, associators, references
+    bool pendingOnly = false;        ///< adapters
+    bool mayDisrupt = false;         ///< activate
 };
 
 using Verb = ExitStatus (*)(Context& context, const VerbOptions& options);
@@ -42,6 +44,8 @@ ExitStatus showIdentities(Context& context, const VerbOptions& options);
 ExitStatus install(Context& context, const VerbOptions& options);
 /// On a server only an image that the inventory offers, with neither types nor force.
 ExitStatus check(Context& context, const VerbOptions& options);
+/// Only in process.
+ExitStatus activate(Context& context, const VerbOptions& options);
 
 /// Both need a server: jobs of this program's own end with it.
 ExitStatus showJobs(Context& context, const VerbOptions& options);

@@ -1,0 +1,77 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "Cli/Update/Card.h"
+
+#include "Cli/Display/Output.h"
+#include "Cli/Display/Terminal.h"
+#include "Cli/Update/Service.h"
+#include "MidAPI/Devlink/Caller.h"
+#include "MidAPI/Devlink/Machine.h"
+#include "MidAPI/ma.h"
+#include "Utils/Utils.h"
+
+namespace cli {
+
+namespace {
+
+std::string caller() {
+    ma::devlink::LinuxMachine machine;
+    return ma::devlink::findCaller(machine);
+}
+
+std::string outcomeText(const ma::Activation& activation) {
+    switch (activation.status) {
+        case ma::Activation::Done:
+            return "done";
+        case ma::Activation::WouldDisrupt:
+            return "denied: " + activation.text;
+        default:
+            return "failed: " + activation.text;
+    }
+}
+
+}  // namespace
+
+ma::CardUse readCard(const Connection& connection, const std::string& adapter) {
+    return connection.isInProcess ? ma::getCardUse(adapter, caller()) : ma::CardUse();
+}
+
+Json cardJson(const ma::CardUse& card) {
+    return {{"functions", card.functions},
+            {"interfaces", card.interfaces},
+            {"bonds", card.bonds},
+            {"bridges", card.bridges},
+            {"losses", card.losses}};
+}
+
+void printCard(std::ostream& out, const ma::CardUse& card) {
+    std::vector<std::vector<std::string>> rows;
+    const auto add = [&rows](const char* what, const std::vector<std::string>& names) {
+        if (!names.empty()) rows.push_back({std::string("  ") + what, joined(names)});
+    };
+    add("functions", card.functions);
+    add("interfaces", card.interfaces);
+    add("bonds", card.bonds);
+    add("bridges", card.bridges);
+    if (!rows.empty()) out << "On this card:\n";
+    printTable(out, rows);
+}
+
+ma::Activation activateFirmware(const std::string& adapter, bool mayDisrupt) {
+    const auto activation = ma::activate(adapter, {.mayDisrupt = mayDisrupt, .caller = caller()});
+    auditOwn("ActivateFirmware", adapter, outcomeText(activation));
+    return activation;
+}
+
+std::string resetAdvice(const std::string& adapter, const std::string& resetNeeded) {
+    if (resetNeeded == "reload")
+        return "It takes effect after a reset: \"quenxctl activate --target " + adapter +
+               "\" does that while the machine runs.";
+    if (resetNeeded == "reboot") return "It takes effect when the machine has been restarted.";
+    if (resetNeeded == "power cycle")
+        return "It takes effect when the machine has been without power for a moment.";
+    if (resetNeeded == "unknown")
+        return "It may take effect only after a reset, which the adapter does not tell: restart the machine.";
+    return {};
+}
+
+}  // namespace cli

@@ -1,0 +1,80 @@
+// SPDX-License-Identifier: Apache-2.0
+// Putting firmware in force that has been written.
+#include "Cli/Display/Output.h"
+#include "Cli/Display/Terminal.h"
+#include "Cli/Update/Card.h"
+#include "Cli/Verbs/Verbs.h"
+#include "MidAPI/ma.h"
+
+namespace cli {
+
+namespace {
+
+/// How an activation ended, for a person and for a script.
+struct Ending {
+    const char* result;
+    Explanation why;
+};
+
+Ending endingOf(const ma::Activation& activation, const std::string& name) {
+    const std::string because = activation.text.empty() ? "." : ": " + activation.text + ".";
+    switch (activation.status) {
+        case ma::Activation::Done:
+            return {"activated", {name + " runs the firmware in its flash.", "", ExitStatus::Done}};
+        case ma::Activation::NotOffered:
+            return {"not offered",
+                    {name + " cannot be activated while the machine runs" + because,
+                     "Restart the machine; some adapters need it to be without power for a moment."}};
+        case ma::Activation::WouldDisrupt:
+            return {"refused",
+                    {"Activating " + name + " would cut the network" + because,
+                     "Do it from another way in, or with --disrupt if you can do without for a moment."}};
+        case ma::Activation::NotBack:
+            return {"not back",
+                    {name + " was reset, but is not all there again" + because,
+                     "Look at \"ip link\" and the kernel's log; a restart of the machine brings it back.",
+                     ExitStatus::Unknown}};
+        default:
+            return {
+                "failed",
+                {"The activation of " + name + " failed" + because,
+                 "The old firmware still runs, if nothing else is said. The kernel's log may have more."}};
+    }
+}
+
+ExitStatus print(Context& context, const std::string& name, const ma::CardUse& card, const Ending& ending) {
+    const Explanation& why = ending.why;
+    if (context.json) {
+        printJson(context.out, {{"result", ending.result},
+                                {"exitStatus", static_cast<int>(why.status)},
+                                {"message", why.message},
+                                {"advice", why.advice},
+                                {"adapter", name},
+                                {"card", cardJson(card)}});
+        return why.status;
+    }
+    const bool isFailure = why.status != ExitStatus::Done && why.status != ExitStatus::AlreadyCurrent;
+    std::ostream& stream = isFailure ? context.error : context.out;
+    stream << (isFailure ? "quenxctl: " : "") << printable(why.message) << '\n';
+    if (!why.advice.empty()) stream << printable(why.advice) << '\n';
+    return why.status;
+}
+
+}  // namespace
+
+ExitStatus activate(Context& context, const VerbOptions& options) {
+    const std::string name = findAdapter(context.connection, options.update.target).name;
+    const ma::CardUse card = readCard(context.connection, name);
+    if (!context.json) printCard(context.out, card);
+    if (ma::getAdapterInfo(name).resetNeeded == ma::ResetNeeded::None) {
+        return print(context, name, card,
+                     {"already current",
+                      {name + " runs the firmware in its flash: nothing waits for a reset.", "",
+                       ExitStatus::AlreadyCurrent}});
+    }
+    const Ending ending = endingOf(activateFirmware(name, options.mayDisrupt), name);
+    context.following.over();
+    return print(context, name, card, ending);
+}
+
+}  // namespace cli
