@@ -3,12 +3,10 @@
 #include <gtest/gtest.h>
 #include <unistd.h>
 
-#include <filesystem>
 #include <sstream>
 
 #include "Cli/Display/Output.h"
 #include "Cli/Display/Progress.h"
-#include "Cli/Update/Candidate.h"
 
 namespace {
 
@@ -16,18 +14,6 @@ using core::CimType;
 using core::CimValue;
 using std::chrono::milliseconds;
 using std::chrono::seconds;
-
-TEST(ImageUriTest, LeavesUrisAloneAndEncodesNothing) {
-    const std::string here = std::filesystem::current_path().string();
-    const std::pair<const char*, std::string> rows[] = {{"/a b%20c:d::e", "file:///a b%20c:d::e"},
-                                                        {"a:b.rom", "file://" + here + "/a:b.rom"},
-                                                        {"FILE:///x", "FILE:///x"},
-                                                        {"file:/x", "file:/x"},
-                                                        {"://x", "file://" + here + "/://x"}};
-    for (const auto& [image, uri] : rows)
-        EXPECT_EQ(cli::imageUri(image), uri);
-    EXPECT_EQ(cli::localPath("FILE:///a::b"), "/a::b");
-}
 
 TEST(OutputTest, WritesValuesAsTextAndAsJson) {
     const std::tuple<CimValue, const char*, const char*> table[] = {

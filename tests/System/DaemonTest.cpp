@@ -12,6 +12,7 @@
 #include "System/HeldFlash.h"
 #include "System/RawConnection.h"
 #include "System/RunningDaemon.h"
+#include "System/Session.h"
 
 namespace {
 
@@ -19,7 +20,6 @@ using test::contains;
 using test::ProgramResult;
 using test::RunningDaemon;
 using ::testing::AllOf;
-using ::testing::ElementsAre;
 using ::testing::HasSubstr;
 
 /// Starts the update of eth0 to a real image and returns the job's path.
@@ -74,52 +74,6 @@ TEST(DaemonTest, DeletesJobsThatHaveEndedWhenAskedTo) {
         "target=\"root/cimv2:Quenx_ConcreteJob.InstanceID=\\\"Quenx:FirmwareUpdate@Job#1\\\"\" "
         "arguments=\"rule='jobs.keep_seconds'\" outcome=\"done\""));
     EXPECT_TRUE(contains(daemon.wbemcli("gi", job).error, "(6) CIM_ERR_NOT_FOUND"));
-}
-
-TEST(DaemonTest, CarriesAnUpdateFromItsStartToItsDeletion) {
-    RunningDaemon daemon;
-    const std::string job = startUpdate(daemon);
-    // The service, the port and its card.
-    for (const char* operation : {"ain", "ai", "rin", "ri"})
-        EXPECT_EQ(daemon.lines(operation, job).size(), 3U) << operation;
-    EXPECT_EQ(daemon.lines("-ac CIM_OwningJobElement -ar OwnedElement ain", job).size(), 1U);
-    EXPECT_TRUE(reaches(daemon, job, "7"));
-    EXPECT_THAT(
-        daemon.lines("ei", "Quenx_SoftwareIdentity"),
-        ::testing::Contains(AllOf(HasSubstr("eth0:IMG_PXE"), HasSubstr("VersionString=\"IMG_PXE 2\""))));
-    EXPECT_EQ(daemon.wbemcli("di", job).status, 0);
-    EXPECT_TRUE(contains(daemon.wbemcli("gi", job).error, "(6) CIM_ERR_NOT_FOUND"));
-    EXPECT_TRUE(contains(daemon.wbemcli("di", job).error, "(6) CIM_ERR_NOT_FOUND"));
-}
-
-TEST(DaemonTest, IsDiscoveredFromTheInteropNamespace) {
-    RunningDaemon daemon;
-    for (const char* name : {"interop", "root/interop"}) {
-        daemon.namespaceName = name;
-        EXPECT_EQ(daemon.lines("ein", "CIM_ObjectManager").size(), 1U);
-        EXPECT_EQ(daemon.lines("ein", "CIM_Namespace").size(), 3U);
-        std::string profile;
-        for (const std::string& path : daemon.lines("ein", "CIM_RegisteredProfile")) {
-            if (contains(path, "SoftwareUpdate")) profile = path;
-        }
-        EXPECT_THAT(daemon.lines("-ac CIM_ElementConformsToProfile ain", profile),
-                    ElementsAre(HasSubstr("/root/cimv2:Quenx_SoftwareInstallationService.")));
-        EXPECT_THAT(daemon.lines("-ac CIM_ReferencedProfile ain", profile),
-                    ElementsAre(HasSubstr("Quenx:EthernetPort")));
-    }
-    // Each end of an association stands in its own namespace, and each path can be asked for.
-    for (const std::string& path : daemon.lines("ein", "CIM_ElementConformsToProfile")) {
-        EXPECT_THAT(daemon.lines("gi", path).at(0),
-                    AllOf(HasSubstr("ConformantStandard=root/interop:Quenx_RegisteredProfile"),
-                          HasSubstr("ManagedElement=root/cimv2:Quenx_")));
-    }
-    const std::string manager = daemon.lines("ein", "CIM_Service").at(0);
-    EXPECT_TRUE(contains(daemon.wbemcli("di", manager).error, "(7) CIM_ERR_NOT_SUPPORTED"));
-    // What is served elsewhere is not shown here.
-    EXPECT_TRUE(contains(daemon.wbemcli("ei", "Quenx_EthernetPort").error, "(5) CIM_ERR_INVALID_CLASS"));
-    EXPECT_TRUE(contains(daemon.wbemcli("gc", "Quenx_EthernetPort").error, "(6) CIM_ERR_NOT_FOUND"));
-    for (const std::string& name : daemon.lines("ecn", ""))
-        EXPECT_FALSE(daemon.lines("gc", name).empty()) << name;
 }
 
 TEST(DaemonTest, LetsAFlashEndBeforeItStops) {
@@ -250,39 +204,7 @@ TEST(DaemonTest, AsksPamAndTheGroupsOfTheSystem) {
     }
 }
 
-TEST(DaemonTest, RunsWhereItIsInstalledAndKeepsWhatIsConfigured) {
-    // Only an installation of the distribution's kind configures the machine itself.
-    for (const auto& [prefix, folder] : {std::pair{"/usr", "/etc"}, {"/usr/local", "/usr/local/etc"}}) {
-        const test::TempFolder place;
-        const std::string staged = place / "staged";
-        // The component is that of every file here; named, it leaves the manifest of a real installation
-        // alone.
-        const std::vector<std::string> install{CMAKE,         "--install",   QUENX_BUILD, "--strip",
-                                               "--component", "Unspecified", "--prefix",  prefix};
-        const ProgramResult installed = test::run(install, {"DESTDIR=" + staged});
-        ASSERT_EQ(installed.status, 0) << installed.error;
-        const std::string config = place.write("config",
-                                               "[listen]\nhttps = false\nhttp = true\nhttp_port = 0\n"
-                                               "socket = ''\n[daemon]\nlock_file = '" +
-                                                   (place / "lock") + "'\n");
-        const ProgramResult checked =
-            test::run({staged + prefix + "/sbin/quenx-cimd", "--check-config", "--config", config});
-        EXPECT_EQ(checked.status, 0) << checked.error;
-        EXPECT_EQ(test::run({staged + prefix + "/bin/quenxctl", "mof"}).status, 0);
-        for (const auto& file : std::filesystem::recursive_directory_iterator(staged)) {
-            if (!file.is_regular_file()) continue;
-            const auto bytes = test::readTestFile(file.path().string());
-            EXPECT_FALSE(contains({bytes.begin(), bytes.end()}, QUENX_BUILD "/lib")) << file.path();
-        }
-        const std::string file = staged + folder + "/pam.d/quenx-cimd";
-        EXPECT_EQ(test::readTestFile(file), test::readTestFile(QUENX_PACKAGING_DIR "/pam.d/quenx-cimd"));
-        std::filesystem::resize_file(file, 0);
-        EXPECT_THAT(test::run(install, {"DESTDIR=" + staged}).out, HasSubstr("Kept: " + file));
-        EXPECT_TRUE(test::readTestFile(file).empty());
-    }
-}
-
-TEST(DaemonTest, NamesWhatKeepsItFromServing) {
+TEST(DaemonTest, ServesWithTheProvidersThatCanBeLoaded) {
     const test::TempFolder folder;
     folder.write("libQuenx_Broken.so", "no library");
     for (const auto& library : std::filesystem::directory_iterator(QUENX_LIBRARIES))
@@ -290,29 +212,28 @@ TEST(DaemonTest, NamesWhatKeepsItFromServing) {
     RunningDaemon daemon({"--providers-directory", folder.path()});
     EXPECT_EQ(daemon.lines("ein", "Quenx_EthernetPort").size(), 5U);
     EXPECT_TRUE(contains(daemon.program().seen(), "libQuenx_Broken.so: ")) << daemon.program().seen();
-
-    const std::string held = "--daemon-lock-file=" + (daemon.folder() / "lock");
-    const std::string lock = "--daemon-lock-file=" + (folder / "lock");
-    const std::string port = std::to_string(daemon.httpPort());
-    const std::string taken = "--listen-http-port=" + port;
-    const std::string free = "--listen-http-port=0";
-    const std::tuple<int, std::vector<std::string>, std::string> table[] = {
-        {1, {held, free}, "process " + std::to_string(daemon.program().id()) + " (quenx-cimd) holds "},
-        {1, {lock, taken}, "127.0.0.1 port " + port + ": Address already in use. Stop the program that"},
-        // The lock is free again.
-        {1, {lock, free, "--providers-directory=/nonexistent"}, "/nonexistent"},
-        // A check says the same, but not of the daemon that a start would replace.
-        {2, {lock, taken, "--check-config"}, "port " + port + ": Address already in use."},
-        {0, {held, taken, "--check-config"}, ""},
-    };
-    const std::string config = folder.write("config", "[listen]\nhttps = false\nhttp = true\nsocket = ''\n");
-    for (const auto& [status, options, said] : table) {
-        std::vector<std::string> command{QUENX_CIMD, "--config", config};
-        command.insert(command.end(), options.begin(), options.end());
-        const ProgramResult result = test::run(command);
-        EXPECT_EQ(result.status, status) << result.error;
-        EXPECT_THAT(result.error, HasSubstr(said));
-    }
 }
+
+class DaemonSessionTest : public ::testing::TestWithParam<const char*> {
+  protected:
+    const RunningDaemon m_daemon;
+};
+
+TEST_P(DaemonSessionTest, ShowsWhatIsWrittenDown) {
+    const std::string loopback = "=127.0.0.1:";
+    test::expectSession(GetParam(), m_daemon.folder(),
+                        "HTTP" + loopback + std::to_string(m_daemon.httpPort()) + "\nHTTPS" + loopback +
+                            std::to_string(m_daemon.httpsPort()) + R"(
+        ADMIN=http://admin:admin@$HTTP
+        export QUENXCTL_PASSWORD=admin QUENXCTL_SOCKET=socket
+        here() { quenxctl --adapters adapters.toml --config provider.conf "$@"; }
+        remote() { quenxctl --server https://$HTTPS --user admin --cacert cert.pem "$@"; }
+        same() { here "$@" | sort >there; remote "$@" | sort | diff there - && test -s there; }
+    )");
+}
+
+INSTANTIATE_TEST_SUITE_P(Shell, DaemonSessionTest,
+                         ::testing::Values("Interop", "Remote", "SameModel", "SecondDaemon", "Update"),
+                         [](const auto& session) { return std::string(session.param); });
 
 }  // namespace

@@ -35,10 +35,8 @@ class Quenxctl : public ::testing::Test {
   protected:
     /// The program, the options that make its environment, and the words of the line.
     virtual std::vector<std::string> command(const std::string& line) const {
-        std::vector<std::string> words{QUENXCTL, "--adapters", m_adapters};
-        // Never the machine's own.
-        if (!contains(line, "--config")) words.insert(words.end(), {"--config", m_configuration});
-        return withWordsOf(line, m_image, words);
+        // Never the machine's own settings.
+        return withWordsOf(line, m_image, {QUENXCTL, "--adapters", m_adapters, "--config", m_defaults});
     }
     ProgramResult quenxctl(const std::string& line, const std::vector<std::string>& environment = {}) const {
         return run(command(line), environment);
@@ -64,8 +62,7 @@ class Quenxctl : public ::testing::Test {
 
     TempFolder m_folder;
     std::string m_adapters = m_folder.write("adapters.toml", kTestAdapters);
-    /// The providers' settings, where a test does not name others: the defaults.
-    std::string m_configuration = m_folder.write("default.conf", "");
+    std::string m_defaults = m_folder.write("default.conf", "");
     /// For eth0 and eth1: a real one with IMG_PXE 2 and IMG_UEFI 2.
     std::string m_image = m_folder.write("new.rom", withRevision(realRom("efi-virtio"), 2));
 };

@@ -62,7 +62,7 @@ ProgramResult RunningDaemon::wbemcli(const std::string& operation, const std::st
     for (std::string word; words >> word;)
         command.push_back(word);
     command.push_back((https ? "https://" : "http://") + user + ":" + password +
-                      "@127.0.0.1:" + std::to_string(https ? m_httpsPort : m_httpPort) + "/" + namespaceName +
+                      "@127.0.0.1:" + std::to_string(https ? m_httpsPort : m_httpPort) + "/root/cimv2" +
                       (path.empty() ? "" : ":" + path));
     command.insert(command.end(), arguments.begin(), arguments.end());
     return run(command);
@@ -73,7 +73,7 @@ std::vector<std::string> RunningDaemon::lines(const std::string& operation, cons
     const ProgramResult result = wbemcli(operation, path, arguments);
     EXPECT_EQ(result.status, 0) << operation << " " << path << ": " << result.error;
     std::istringstream text(result.out);
-    const std::string front = "127.0.0.1:" + std::to_string(m_httpPort) + "/" + namespaceName + ":";
+    const std::string front = "127.0.0.1:" + std::to_string(m_httpPort) + "/root/cimv2:";
     std::vector<std::string> found;
     for (std::string line; std::getline(text, line);)
         found.push_back(line.starts_with(front) ? line.substr(front.size()) : line);

@@ -42,7 +42,6 @@ class RunningDaemon {
 
     std::string user = "admin";
     std::string password = "admin";
-    std::string namespaceName = "root/cimv2";
 
   private:
     TempFolder m_folder;
