@@ -74,40 +74,16 @@ TEST(AdapterDescriptionTest, ReadsAddresses) {
 }
 
 TEST(AdapterDescriptionTest, NamesMistakesWithPlaceAndRemedy) {
-    const std::pair<std::string, const char*> table[] = {
-        {"\n[adaptor]", "a.toml, line 2: adapter description: unknown key \"adaptor\"; the keys are adapter"},
-        {"adapter = [ 1 ]", "line 1: adapter description: \"adapter\" must be a list of tables"},
-        {"[[[", "a.toml, line 1: "},
-        {"\na = 3\"\xD2\x82", "a.toml, line 2: a character beyond ASCII"},
-        {"a = 1 # \xC3\xA4\n\xC3\xA4 = 1",
-         "line 2: a character beyond ASCII stands outside a text in quotes"},
-        {"a = 0x[''P'\xC3\xA4", "a.toml, line 1: a character beyond ASCII"},
-        {"a = 6-[[\"\xC3\xA4", "a.toml, line 1: a character beyond ASCII"},
-        {"a = [[1\n\xEF\xB7\xB6]]", "a.toml, line 2: a character beyond ASCII"},
-        {"a = '\\' \xC3\xA4", "a.toml, line 1: a character beyond ASCII"},
-        {"a = \"\"\"b\"\"\"\"\"\n\xC3\xA4", "a.toml, line 2: a character beyond ASCII"},
-        {"a = \"\"\"b\\\n \xEF\xBB\xB5\"\"\"", "a.toml, line 2: a character beyond ASCII"},
-        {"\xEF\xBB\xBF# \xC3\xA4\na=['\xC3\xA4#', \"\\\"\xC3\xA4'\", \"\"\"\n\xC3\xA4\"\"\"]",
-         "line 2: adapter description: unknown key"},
-        {"[[adapter]]", "line 1: adapter 1: \"name\" is missing; write for example name = \"eth0\""},
-        {"[[adapter]]\nnmae = \"x\"", "line 2: adapter 1: unknown key \"nmae\"; the keys are name, "},
-        {"[[adapter]]\nname = \"a\\nb\"", "\"name\" is \"a?b\""},
-        {adapterAt("03"), "must be like \"0000:03:00.0\""},
-        {adapterWith("speeed = 1"), "line 6: adapter \"eth0\": unknown key \"speeed\""},
-        {adapterWith("speed = -1"), "\"speed\" must be a whole number from 0 to"},
-        {adapterWith("link = 1"), "\"link\" must be true or false"},
-        {adapterWith("boot_type = \"disk\""), "is \"disk\", it must be none, pxe, iscsi, fcoe or uefi"},
-        {adapterWith("subsystem_id = \"1af4\""), "\"subsystem_id\" is \"1af4\", it must be like"},
-        {adapterWith("components = [ { type = \"IMG_PXE\", revision = 65536 } ]"),
-         "a component of \"eth0\": \"revision\" must be a whole number from 0 to 65535"},
-        {adapterWith("[[adapter.fault]]\naction = \"kill\""), "a fault of \"eth0\": \"at\" is missing"},
-        {adapterWith("[[adapter.fault]]\nat = \"write\"\naction = \"burn\""), "line 8: a fault of \"eth0\""},
-        {adapterWith("") + adapterWith(""), "two adapters are called \"eth0\""},
-    };
-    for (const auto& [text, expected] : table) {
-        EXPECT_THAT([&text = text] { ma::parseAdapterDescriptions(text, "a.toml"); },
-                    ThrowsMessage<ma::AdapterError>(HasSubstr(expected)))
-            << text;
+    // Each description, after what is said of it.
+    const auto bytes = test::readTestFile(QUENX_MIDAPI_TEST_DIR "/samples/mistakes");
+    const std::string sample(bytes.begin(), bytes.end());
+    ASSERT_TRUE(sample.starts_with("=== "));
+    for (std::size_t begin = 0, end = 0; end != std::string::npos; begin = end + 1) {
+        const std::size_t text = sample.find('\n', begin) + 1;
+        end = sample.find("\n=== ", text);
+        const std::string said = sample.substr(begin + 4, text - 1 - (begin + 4));
+        EXPECT_THAT([&] { ma::parseAdapterDescriptions(sample.substr(text, end - text), "a.toml"); },
+                    ThrowsMessage<ma::AdapterError>(HasSubstr(said)));
     }
 }
 
