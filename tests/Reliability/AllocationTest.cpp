@@ -66,10 +66,9 @@ class AllocationTest : public test::UpdateTest {
     const std::string m_image = goodImage();
     const std::string m_old = test::describeRom(m_adapters->flashContent("eth0"));
     const core::CimPath m_service = service();
-    const std::vector<core::Argument> m_arguments = {
-        test::textArgument("URI", m_image), test::pathArgument("Target", port("eth0")),
-        test::codesArgument("InstallOptions", {5, 32768}),
-        test::textsArgument("InstallOptionsValues", {"", "IMG_PXE+IMG_UEFI"})};
+    const std::vector<core::Argument> m_arguments =
+        argumentsOf("URI=" + m_image + "; Target=" + port("eth0").toString() +
+                    "; InstallOptions=5,32768; InstallOptionsValues=,IMG_PXE+IMG_UEFI");
 };
 
 TEST_F(AllocationTest, FailingInTheRequestAndInTheWorker) {

@@ -155,7 +155,7 @@ class FaultTableTest : public test::UpdateTest {
 
     std::string components() const { return test::describeRom(m_adapters->flashContent("eth4")); }
     CallResult installOnEth4(const std::string& uri) const {
-        return install(uri, m_port, {32768, 5}, {"IMG_UEFI"});
+        return install(uri, m_port, "32768,5", "IMG_UEFI");
     }
 
     const core::CimPath m_port = port("eth4");

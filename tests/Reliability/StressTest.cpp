@@ -115,7 +115,7 @@ class StressTest : public test::UpdateTest {
     }
     void startInstall(Random& random) {
         const auto& [adapter, uri] = pick(m_targets, random);
-        const CallResult result = install(uri, port(adapter), {5, 3});
+        const CallResult result = install(uri, port(adapter), "5,3");
         EXPECT_EQ(result.error, "");
         if (result.job) {
             ++m_started;
@@ -129,9 +129,9 @@ class StressTest : public test::UpdateTest {
     }
     void check(Random& random) {
         const auto sources = m_requests.enumerateInstanceNames("Quenx_SoftwareIdentity");
+        const std::string target = port(pick(m_targets, random).first).toString();
         const CallResult result = call("CheckSoftwareIdentity",
-                                       {test::pathArgument("Source", pick(sources, random)),
-                                        test::pathArgument("Target", port(pick(m_targets, random).first))});
+                                       "Source=" + pick(sources, random).toString() + "; Target=" + target);
         EXPECT_EQ(result.error, "");
         if (result.returnValue == 0) ++m_checked;
     }

@@ -52,7 +52,7 @@ TEST_F(ModelTest, ServesEachClassAsTheSampleHasIt) {
     std::string served;
     for (const std::string& name : classes)
         served += valuesOf(name);
-    const auto sample = test::readTestFile(QUENX_MODEL_SAMPLE);
+    const auto sample = test::readTestFile(QUENX_UPDATE_SAMPLES "/model");
     std::string expected(sample.begin(), sample.end());
     expected = std::regex_replace(expected, std::regex("<FOLDER>"), m_folder.path());
     EXPECT_EQ(served, std::regex_replace(expected, std::regex("<HOST>"), os::getHostname()));

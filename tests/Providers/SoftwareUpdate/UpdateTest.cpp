@@ -1,18 +1,28 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Providers/SoftwareUpdate/UpdateTest.h"
 
-#include <chrono>
-#include <thread>
-
 #include "Framework/Classes/InstanceList.h"
 #include "Support/TestRoms.h"
 
 namespace test {
 
 using core::Argument;
-using core::CimScalar;
 using core::CimType;
 using core::CimValue;
+
+namespace {
+
+CimValue valueOf(CimType type, bool isArray, const std::string& text) {
+    if (text == "null") return CimValue::null(type, isArray);
+    if (type == CimType::Reference) return CimValue::of(type, core::CimPath(text));
+    if (!isArray) return CimValue::of(type, text);
+    std::vector<core::CimScalar> elements;
+    for (const std::string& element : utils::split(text, ','))
+        if (!text.empty()) elements.push_back(core::parseScalar(type, element).value());
+    return CimValue::arrayOf(type, std::move(elements));
+}
+
+}  // namespace
 
 UpdateTest::UpdateTest()
     : m_config(m_folder.write("quenx.conf", "FWFilePath=" + m_folder.path() + "\n")),
@@ -36,10 +46,24 @@ core::CimPath UpdateTest::pathNamed(const std::string& className, const std::str
     return {};
 }
 
-CallResult UpdateTest::call(const std::string& method, const std::vector<Argument>& arguments) const {
+std::vector<Argument> UpdateTest::argumentsOf(const std::string& text) {
+    std::vector<Argument> arguments;
+    for (std::size_t begin = 0, end = 0; end != std::string::npos; begin = end + 2) {
+        end = text.find("; ", begin);
+        const std::string one = text.substr(begin, end - begin);
+        const std::string name = one.substr(0, one.find('='));
+        const bool isArray = name.starts_with("Install");
+        const bool isText = name == "URI" || name == "InstallOptionsValues";
+        const CimType type = isText ? CimType::String : isArray ? CimType::Uint16 : CimType::Reference;
+        arguments.push_back({name, valueOf(type, isArray, one.substr(name.size() + 1))});
+    }
+    return arguments;
+}
+
+CallResult UpdateTest::call(const std::string& method, const std::string& arguments) const {
     CallResult result;
     try {
-        const core::MethodResult answer = m_requests.invokeMethod(service(), method, arguments);
+        const core::MethodResult answer = m_requests.invokeMethod(service(), method, argumentsOf(arguments));
         result.returnValue = answer.returnValue;
         for (const Argument& output : answer.outputs) {
             if (output.name == "Job") result.job = std::get<core::CimPath>(*output.value.scalar());
@@ -53,22 +77,16 @@ CallResult UpdateTest::call(const std::string& method, const std::vector<Argumen
 }
 
 CallResult UpdateTest::install(const std::string& uri, const core::CimPath& target,
-                               std::vector<std::uint16_t> options, std::vector<std::string> values) const {
-    return call("InstallFromURI",
-                {textArgument("URI", uri), pathArgument("Target", target),
-                 codesArgument("InstallOptions", options), textsArgument("InstallOptionsValues", values)});
+                               const std::string& options, const std::string& values) const {
+    return call("InstallFromURI", "URI=" + uri + "; Target=" + target.toString() +
+                                      "; InstallOptions=" + options + "; InstallOptionsValues=" + values);
 }
 
 core::InstanceValue UpdateTest::waitForEnd(const core::CimPath& job) const {
-    const auto deadline = std::chrono::steady_clock::now() + std::chrono::seconds(60);
     while (true) {
         core::InstanceValue value = m_requests.getInstance(job);
         if (state(value) == JobStateCompleted || state(value) == JobStateException) return value;
-        if (std::chrono::steady_clock::now() > deadline) {
-            ADD_FAILURE() << job.toString() << " does not end; it is in state " << state(value);
-            return value;
-        }
-        std::this_thread::sleep_for(std::chrono::milliseconds(2));
+        utils::Thread::msleep(2);
     }
 }
 
@@ -114,25 +132,6 @@ std::string UpdateTest::file(const std::string& name, const std::vector<std::uin
 
 std::string UpdateTest::goodImage() const {
     return file("good.rom", madeRom({{utils::FirmwareType::PXE, 2}, {utils::FirmwareType::UEFI, 1}}));
-}
-
-Argument pathArgument(const char* name, const core::CimPath& path) {
-    return {name, CimValue::of(CimType::Reference, CimScalar(path))};
-}
-
-Argument textArgument(const char* name, const std::string& text) {
-    return {name, CimValue::of(CimType::String, CimScalar(text))};
-}
-
-Argument codesArgument(const char* name, const std::vector<std::uint16_t>& codes) {
-    std::vector<CimScalar> values;
-    for (const std::uint16_t code : codes)
-        values.emplace_back(std::uint64_t{code});
-    return {name, CimValue::arrayOf(CimType::Uint16, std::move(values))};
-}
-
-Argument textsArgument(const char* name, const std::vector<std::string>& texts) {
-    return {name, CimValue::arrayOf(CimType::String, {texts.begin(), texts.end()})};
 }
 
 }  // namespace test

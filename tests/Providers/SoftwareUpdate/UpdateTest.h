@@ -43,15 +43,18 @@ class UpdateTest : public ::testing::Test {
         return m_requests.enumerateInstanceNames("Quenx_SoftwareInstallationService").at(0);
     }
 
-    CallResult call(const std::string& method, const std::vector<core::Argument>& arguments) const;
-    /// InstallFromURI with options, by default {5}, on an instance or on the port of an adapter.
-    CallResult install(const std::string& uri, const core::CimPath& target,
-                       std::vector<std::uint16_t> options = {5}, std::vector<std::string> values = {}) const;
+    /// Arguments of the methods, from "Name=value; Name=value". The elements of an array are joined by
+    /// commas; the word null stands for no value.
+    static std::vector<core::Argument> argumentsOf(const std::string& text);
+    CallResult call(const std::string& method, const std::string& arguments) const;
+    /// InstallFromURI with options, on an instance or on the port of an adapter.
+    CallResult install(const std::string& uri, const core::CimPath& target, const std::string& options = "5",
+                       const std::string& values = "") const;
     CallResult install(const std::string& uri, const char* adapter) const {
         return install(uri, port(adapter));
     }
 
-    /// Follows the job to its end; fails the test when it takes too long.
+    /// Follows the job to its end.
     core::InstanceValue waitForEnd(const core::CimPath& job) const;
 
     static std::uint64_t state(const core::InstanceValue& job) { return job.number("JobState"); }
@@ -88,11 +91,5 @@ class UpdateTest : public ::testing::Test {
     /// Has no state of its own.
     mutable core::CimRequests m_requests{"root/cimv2"};
 };
-
-// Arguments of methods.
-core::Argument pathArgument(const char* name, const core::CimPath& path);
-core::Argument textArgument(const char* name, const std::string& text);
-core::Argument codesArgument(const char* name, const std::vector<std::uint16_t>& codes);
-core::Argument textsArgument(const char* name, const std::vector<std::string>& texts);
 
 }  // namespace test
