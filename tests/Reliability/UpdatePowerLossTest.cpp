@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 // The power fails at the k-th change that an update makes to the flash, for every k.
 #include <fstream>
+#include <limits>
 #include <map>
 
 #include "Providers/SoftwareUpdate/UpdateTest.h"
@@ -22,22 +23,14 @@ struct Medium {
     bool keepsContents;
 };
 
-/// Cuts the power at the k-th call, in the middle of it where it writes, and knows what had been synced until
-/// then. Used by one thread at a time.
+/// Cuts the power at the k-th call from some point on, in the middle of it where it writes, and knows what
+/// had been synced until then. Used by one thread at a time.
 class CutFiles : public ma::FlashFiles {
   public:
-    /// What is in the folder already is on the medium.
-    CutFiles(int cutAt, const std::string& root) : m_cutAt(cutAt) {
-        for (const auto& found : fs::recursive_directory_iterator(root)) {
-            const std::string path = found.path();
-            if (found.is_directory()) m_entries[path] = nullptr;
-            if (!isFlash(found)) continue;
-            const Bytes bytes = test::readTestFile(path);
-            m_entries[path] = std::make_shared<Content>(Content{bytes, bytes});
-        }
-        m_syncedEntries = m_entries;
+    void cutAt(int call) {
+        m_calls = 0;
+        m_cutAt = call;
     }
-
     bool wasCut() const { return m_calls >= m_cutAt; }
 
     void makeFolder(const std::string& path) override {
@@ -83,7 +76,7 @@ class CutFiles : public ma::FlashFiles {
     /// Makes the real files what the medium holds.
     void lose(const Medium& medium, const std::string& root) const {
         for (const auto& found : fs::recursive_directory_iterator(root))
-            if (isFlash(found)) fs::remove(found.path());
+            if (found.is_regular_file() && found.path().extension() != ".lock") fs::remove(found.path());
         for (const auto& [path, content] : medium.keepsEntries ? m_entries : m_syncedEntries) {
             if (!content || !fs::exists(fs::path(path).parent_path())) continue;
             const Bytes& bytes = medium.keepsContents ? content->now : content->synced;
@@ -99,14 +92,11 @@ class CutFiles : public ma::FlashFiles {
     };
     using Entries = std::map<std::string, std::shared_ptr<Content>>;
 
-    static bool isFlash(const fs::directory_entry& found) {
-        return found.is_regular_file() && found.path().extension() != ".lock";
-    }
     void count() {
         if (++m_calls >= m_cutAt) throw Cut{};
     }
 
-    const int m_cutAt;
+    int m_cutAt = std::numeric_limits<int>::max();
     int m_calls = 0;
     Entries m_entries;
     Entries m_syncedEntries;
@@ -115,24 +105,14 @@ class CutFiles : public ma::FlashFiles {
 
 class UpdatePowerLossTest : public test::UpdateTest {
   protected:
-    static std::shared_ptr<ma::Simulator> powerOn(const std::string& root,
-                                                  std::shared_ptr<ma::FlashFiles> files) {
-        auto simulator = std::make_shared<ma::Simulator>(
-            ma::parseAdapterDescriptions(test::kTestAdapters, ""), root, std::move(files));
-        ma::setBackend(simulator);
-        return simulator;
-    }
-
     /// Loses the power at the k-th call of an update. False when the update made fewer.
     bool cutAt(int k, bool updatedBefore, const Medium& medium) const {
-        const test::TempFolder folder;
-        const std::string root = folder.path();
-        const auto before = powerOn(root, std::make_shared<test::UnsyncedFiles>());
+        const auto files = std::make_shared<CutFiles>();
+        test::SimulatedAdapters adapters(test::kTestAdapters, files);
+        fs::create_directory(adapters.stateDirectory());
         if (updatedBefore) waitForEnd(*install(m_first, "eth0").job);
-        const std::vector<uint8_t> old = before->flashContent("eth0");
-
-        const auto files = std::make_shared<CutFiles>(k, root);
-        powerOn(root, files);
+        const std::vector<uint8_t> old = adapters->flashContent("eth0");
+        files->cutAt(k);
         const test::CallResult update = install(m_image, "eth0");
         EXPECT_EQ(update.returnValue, 4096U) << update.error;
         if (!update.job) return false;
@@ -142,14 +122,16 @@ class UpdatePowerLossTest : public test::UpdateTest {
         EXPECT_EQ(text(job, "ErrorCode"), finished ? "0" : "4");
         EXPECT_EQ(claim(), "");
 
-        files->lose(medium, root);
-        const auto after = powerOn(root, std::make_shared<test::UnsyncedFiles>());
-        const std::vector<uint8_t> found = after->flashContent("eth0");
+        files->lose(medium, adapters.stateDirectory());
+        const bool wasCut = files->wasCut();
+        files->cutAt(std::numeric_limits<int>::max());
+        adapters.restart();
+        const std::vector<uint8_t> found = adapters->flashContent("eth0");
         EXPECT_TRUE(found == m_new || (!finished && found == old)) << test::describeRom(found);
         expectUpdateWorks();
-        EXPECT_EQ(test::describeRom(after->flashContent("eth0")), "IMG_PXE 2, IMG_UEFI 1");
+        EXPECT_EQ(test::componentsOf("eth0"), "IMG_PXE 2, IMG_UEFI 1");
         deleteJobs();
-        return files->wasCut();
+        return wasCut;
     }
 
     /// Of a length that takes several chunks.

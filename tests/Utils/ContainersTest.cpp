@@ -9,20 +9,17 @@
 
 namespace {
 
+/// Tells its deletion.
 struct Element {
-    explicit Element(std::vector<int>& log, int id) : m_deleted(log), m_id(id) {}
-    virtual ~Element() { m_deleted.push_back(m_id); }
-    std::vector<int>& m_deleted;
-    const int m_id;
+    ~Element() { deleted.push_back(this); }
+    static inline std::vector<const void*> deleted;
 };
 
 using List = utils::SafeList<Element*>;
 
 struct SafeListTest : ::testing::Test {
-    std::vector<int> deleted;
-    Element one{deleted, 1};
-    Element two{deleted, 2};
-    List list{false};
+    Element one, two;
+    List list;
 };
 
 }  // namespace
@@ -70,14 +67,14 @@ TEST_F(SafeListTest, TransfersAnIteratorThatIsCopied) {
 }
 
 TEST_F(SafeListTest, DeletesFrontToBackAndSkipsNullWhenOwning) {
-    {
-        List owning(true);
-        for (int id : {1, 2})
-            owning.add(new Element(deleted, id));
-        owning.add(nullptr);
-        owning.clear();
-        EXPECT_EQ(deleted, (std::vector<int>{1, 2}));
-        owning.add(new Element(deleted, 3));
-    }
-    EXPECT_EQ(deleted, (std::vector<int>{1, 2, 3}));
+    auto owning = std::make_unique<List>(true);
+    const std::vector<Element*> elements{new Element, nullptr, new Element};
+    Element::deleted.clear();
+    for (Element* const each : elements)
+        owning->add(each);
+    owning->clear();
+    EXPECT_EQ(Element::deleted, (std::vector<const void*>{elements[0], elements[2]}));
+    owning->add(new Element);
+    owning.reset();
+    EXPECT_EQ(Element::deleted.size(), 3U);
 }

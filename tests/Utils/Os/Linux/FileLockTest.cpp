@@ -1,9 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Utils/Os/Linux/FileLock.h"
 
-#include <fcntl.h>
 #include <gmock/gmock.h>
-#include <sys/file.h>
 #include <sys/stat.h>
 #include <sys/wait.h>
 
@@ -11,6 +9,7 @@
 #include <filesystem>
 #include <system_error>
 
+#include "Support/Program.h"
 #include "Support/TempFolder.h"
 #include "Utils/Os/Linux/OwnFiles.h"
 
@@ -29,23 +28,15 @@ TEST(FileLockTest, TellsWhoHoldsIt) {
 
     // Another program's lock, which leaves no number in the file.
     const std::string other = folder.write("other", "");
-    int ready[2];
-    ASSERT_EQ(::pipe(ready), 0);
-    const pid_t child = ::fork();
-    if (child == 0) {
-        const int file = ::open(other.c_str(), O_RDONLY);
-        ::flock(file, LOCK_SH);
-        (void)!::write(ready[1], "x", 1);
-        for (;;)
-            ::pause();
+    {
+        const std::string sleep = "echo ready; exec sleep 60";
+        test::Program holder({"/usr/bin/flock", "--no-fork", "--shared", other, "/bin/sh", "-c", sleep});
+        ASSERT_TRUE(holder.waitFor("ready"));
+        const os::FileLock refused(other);
+        EXPECT_FALSE(refused.isHeld());
+        const std::string begin = "process " + std::to_string(holder.id()) + " (";
+        EXPECT_TRUE(refused.holder().starts_with(begin)) << refused.holder();
     }
-    char byte = 0;
-    ASSERT_EQ(::read(ready[0], &byte, 1), 1);
-    const os::FileLock refused(other);
-    EXPECT_FALSE(refused.isHeld());
-    EXPECT_TRUE(refused.holder().starts_with("process " + std::to_string(child) + " (")) << refused.holder();
-    ::kill(child, SIGKILL);
-    ::waitpid(child, nullptr, 0);
     // Nor does a child keep what its parent held, and lets go of.
     auto let = std::make_unique<os::FileLock>(other, std::chrono::seconds(30));
     EXPECT_TRUE(let->isHeld());
