@@ -1,9 +1,12 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Providers/SoftwareInventory/Devices.h"
 
+#include <algorithm>
+
 #include "MidAPI/Image/OptionRom.h"
 #include "MidAPI/ma.h"
 #include "Utils/Exception.h"
+#include "Utils/Utils.h"
 
 namespace inventory {
 
@@ -43,6 +46,13 @@ std::optional<ma::AdapterInfo> readInfo(const std::string& adapter) {
     } catch (const utils::Exception&) {
         return std::nullopt;  // logged by the exception itself
     }
+}
+
+std::string domainOf(const utils::PCIAddr& address) {
+    const std::string_view text = address.text;
+    const bool isFull = std::ranges::count(text, ':') == 2;
+    const auto number = utils::parseNumber<std::uint32_t>(text.substr(0, text.find(':')), 16);
+    return isFull && number.value_or(0) != 0 ? std::string(text.substr(0, text.find(':') + 1)) : "";
 }
 
 std::vector<Identification> identify(const std::string& address, const std::optional<ma::AdapterInfo>& info,

@@ -33,6 +33,10 @@ std::vector<Port> readPorts();
 /// What is known of the port; nothing when it does not answer.
 std::optional<ma::AdapterInfo> readInfo(const std::string& adapter);
 
+/// "0001:" of an address whose text begins so; empty for the first domain, which is all that most machines
+/// have, and for a text that is no full address.
+std::string domainOf(const utils::PCIAddr& address);
+
 /// A row of OtherIdentifyingInfo with its row of IdentifyingDescriptions.
 struct Identification {
     std::string description;

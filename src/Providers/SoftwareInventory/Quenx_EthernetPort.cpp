@@ -26,8 +26,8 @@ void Quenx_EthernetPort::refresh() {
     const std::optional<ma::AdapterInfo> info = inventory::readInfo(m_port.adapter);
     const bool updatable = ma::getCanBeUpdated(m_port.adapter);
 
-    std::vector<inventory::Identification> rows =
-        inventory::identify(utils::formatPCIAddr(m_port.address), info, updatable);
+    const std::string address = inventory::domainOf(m_port.address) + utils::formatPCIAddr(m_port.address);
+    std::vector<inventory::Identification> rows = inventory::identify(address, info, updatable);
     if (info) {
         for (const std::string& interface : info->interfaces)
             rows.push_back({"Network Interface", interface});

@@ -2,6 +2,7 @@
 #include "Providers/SoftwareInventory/Quenx_PortController.h"
 
 #include <map>
+#include <tuple>
 
 #include "MidAPI/ma.h"
 #include "Providers/SoftwareInventory/Devices.h"
@@ -11,9 +12,11 @@ namespace inventory {
 
 std::vector<Card> groupByCard(const std::vector<Port>& ports) {
     std::vector<Card> cards;
-    std::map<std::pair<std::uint8_t, std::uint8_t>, std::size_t> known;
+    std::map<std::tuple<std::string, std::uint8_t, std::uint8_t>, std::size_t> known;
     for (const Port& port : ports) {
-        const auto [place, isNew] = known.try_emplace({port.address.bus, port.address.device}, cards.size());
+        const utils::PCIAddr& address = port.address;
+        const auto [place, isNew] =
+            known.try_emplace({domainOf(address), address.bus, address.device}, cards.size());
         if (isNew) cards.emplace_back();
         cards[place->second].ports.push_back(port);
     }
@@ -28,7 +31,7 @@ Quenx_PortController::Quenx_PortController(inventory::Card card) : m_card(std::m
 }
 
 std::string Quenx_PortController::getUniqId() const {
-    return utils::formatPCIAddr(getPCIAddress());
+    return inventory::domainOf(m_card.ports.front().address) + utils::formatPCIAddr(getPCIAddress());
 }
 
 void Quenx_PortController::refresh() {
@@ -59,7 +62,8 @@ utils::PCIAddr Quenx_PortController::getPCIAddress() const {
 
 bool Quenx_PortController::holds(const utils::PCIAddr& address) const {
     // The functions of one PCI device are the ports of one card.
-    return address.sameAdapter(m_card.ports.front().address);
+    const utils::PCIAddr& own = m_card.ports.front().address;
+    return address.sameAdapter(own) && inventory::domainOf(address) == inventory::domainOf(own);
 }
 
 core::InstanceList::Iterator Quenx_PortControllerClass::getInstances() {

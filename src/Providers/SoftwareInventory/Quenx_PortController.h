@@ -8,7 +8,7 @@
 
 namespace inventory {
 
-/// A card: the ports that share a PCI bus and device. Never without a port.
+/// A card: the ports that share a PCI domain, bus and device. Never without a port.
 struct Card {
     std::vector<Port> ports;
 
@@ -28,7 +28,7 @@ class Quenx_PortController final : public CIM_PortController, public inventory::
     explicit Quenx_PortController(inventory::Card card);
     std::string getClassName() const override { return classInfo.name; }
 
-    /// Bus and device, as "3b:00".
+    /// Bus and device, as "3b:00"; in other domains than the first as "0001:3b:00".
     virtual std::string getUniqId() const;
     /// Asks the card's ports, then sets every value that can change.
     virtual void refresh();

@@ -4,6 +4,8 @@
 #include "Framework/Classes/CimBroker.h"
 #include "Framework/Classes/InstanceList.h"
 #include "Framework/Classes/RequestScope.h"
+#include "MidAPI/ma.h"
+#include "Providers/Schema/ProviderInterfaces.h"
 #include "Providers/SoftwareUpdate/UpdateTest.h"
 
 namespace {
@@ -43,6 +45,18 @@ TEST_F(PortsTest, StayTheSameObjectsWhileTheAdaptersDo) {
     EXPECT_EQ(table("Quenx_EthernetPort", {"OtherIdentifyingInfo"}).at(1),
               "09:00.1,1af4:1041,1af4:1041,Supported,simulator");
     EXPECT_EQ(table("Quenx_PortController", {"Name"}), (Rows{"03:00", "09:00", "04:00", "05:00", "06:00"}));
+
+    changed = test::kTestAdapters;
+    changeAdapters(changed.replace(changed.find("0000:04:00.0"), 12, "0001:03:00.0"));
+    EXPECT_EQ(table("Quenx_EthernetPort", {"OtherIdentifyingInfo"}).at(2),
+              "0001:03:00.0,10ec:8139,10ec:8139,Supported,simulator");
+    EXPECT_EQ(table("Quenx_PortController", {"Name"}), (Rows{"03:00", "0001:03:00", "05:00", "06:00"}));
+    int holders = 0;
+    for (const core::CimInstance* each : objects()) {
+        const auto* card = dynamic_cast<const inventory::PortController*>(each);
+        if (card != nullptr && card->holds(ma::getPCIAddress("eth2"))) ++holders;
+    }
+    EXPECT_EQ(holders, 1) << "an update of the other card must not come to this one";
 }
 
 TEST_F(PortsTest, ThatDoNotAnswerHideNoOthers) {
