@@ -46,8 +46,9 @@ TEST_P(SessionTest, ShowsWhatIsWrittenDown) {
 }
 
 INSTANTIATE_TEST_SUITE_P(Shell, SessionTest,
-                         ::testing::Values("BadFiles", "CommandLine", "ConfigCheck", "Daemon", "Identities",
-                                           "Install", "Json", "Settings", "Staged", "WrongImages"),
+                         ::testing::Values("BadFiles", "CommandLine", "ConfigCheck", "Daemon", "Domains",
+                                           "Identities", "Install", "Json", "Settings", "Staged",
+                                           "WrongImages"),
                          [](const auto& session) { return session.param; });
 
 }  // namespace

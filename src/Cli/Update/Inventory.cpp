@@ -63,19 +63,20 @@ void takeStored(std::vector<Component>& components, const Component& stored) {
     if (running != components.end()) running->stored = stored.text;
 }
 
-/// Without the domain that "lspci -D" prints and the model leaves out.
-std::string_view withoutDomain(std::string_view pciAddress) {
-    constexpr std::string_view kFirstDomain = "0000:";
-    if (pciAddress.starts_with(kFirstDomain)) pciAddress.remove_prefix(kFirstDomain.size());
-    return pciAddress;
+bool isNamed(const Adapter& adapter, const std::string& target) {
+    const core::CimPath path(target);
+    return adapter.name == target || (path.isInstancePath() && adapter.path.isSameObjectAs(path));
 }
 
-bool isMeant(const Adapter& adapter, const std::string& target) {
-    const std::string_view address = withoutDomain(adapter.pciAddress);
-    const core::CimPath path(target);
+/// By the address with the domain that "lspci -D" prints, and that the model leaves out where it is the first
+/// one; or by the address without it, which adapters of several domains may have.
+bool isAt(const Adapter& adapter, std::string_view target) {
+    const auto hasDomain = [](std::string_view address) { return std::ranges::count(address, ':') == 2; };
+    const std::string& shown = adapter.pciAddress;
+    const std::string full = hasDomain(shown) ? shown : "0000:" + shown;
     // An adapter without an address must not be meant by an empty one.
-    return adapter.name == target || (!address.empty() && core::sameName(address, withoutDomain(target))) ||
-           (path.isInstancePath() && adapter.path.isSameObjectAs(path));
+    return !shown.empty() &&
+           core::sameName(hasDomain(target) ? full : full.substr(full.find(':') + 1), target);
 }
 
 constexpr const char* kAskInventory =
@@ -230,10 +231,21 @@ Adapter findAdapter(const Connection& connection, const std::string& target) {
     if (adapters.empty())
         throw CommandError(ExitStatus::NotFound, "There are no adapters.", adviceForNoAdapters(connection));
     std::vector<std::string> names;
+    std::vector<std::string> namesThere;
+    Adapter* there = nullptr;
     for (Adapter& adapter : adapters) {
-        if (isMeant(adapter, target)) return std::move(adapter);
+        if (isNamed(adapter, target)) return std::move(adapter);
         names.push_back(adapter.name);
+        if (!isAt(adapter, target)) continue;
+        there = &adapter;
+        namesThere.push_back(adapter.name);
     }
+    if (namesThere.size() > 1)
+        throw CommandError(
+            ExitStatus::WrongUse,
+            "Several adapters have the PCI address " + target + ": " + joined(namesThere) + ".",
+            "Name one of them, or write its address with the PCI domain.");
+    if (there != nullptr) return std::move(*there);
     throw CommandError(ExitStatus::NotFound, "There is no adapter \"" + target + "\".",
                        didYouMean(target, names) + "The adapters are " + joined(names) + ".");
 }

@@ -84,7 +84,7 @@ std::string searchText(const Connection& connection);
 std::string adviceForNoAdapters(const Connection& connection);
 
 /// The adapter that a user means: by its name, its PCI address with or without the domain, or the text of its
-/// object path. Throws CommandError that names the adapters there are.
+/// object path. Throws CommandError that names the adapters there are, or those that share a short address.
 Adapter findAdapter(const Connection& connection, const std::string& target);
 
 /// A software identity: an image that can be installed, or a component that is installed.
