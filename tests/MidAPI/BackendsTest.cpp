@@ -20,33 +20,34 @@ namespace {
 
 constexpr const char* kPciDevices = "/sys/bus/pci/devices";
 
-/// These variables, and no others of those that choose adapters, until the end of the scope. No backend is
-/// chosen at first.
-class ChoosingVariables {
-  public:
+class BackendsTest : public testing::Test {
+  protected:
     using Values = std::map<std::string, std::string>;
 
-    explicit ChoosingVariables(const Values& values) : m_backend(ma::setBackend(nullptr)) {
-        for (const char* name : {"QUENX_BACKEND", "QUENX_ADAPTERS", "QUENX_ADAPTER_STATE"}) {
-            if (const char* old = std::getenv(name)) m_old.emplace(name, old);
-            ::unsetenv(name);
-            const auto value = values.find(name);
-            if (value != values.end()) ::setenv(name, value->second.c_str(), 1);
-        }
+    BackendsTest() {
+        for (const char* name : kVariables)
+            if (const char* value = std::getenv(name)) m_before.emplace(name, value);
     }
-    ChoosingVariables(const ChoosingVariables&) = delete;
-    ChoosingVariables& operator=(const ChoosingVariables&) = delete;
-    ~ChoosingVariables() {
-        for (const char* name : {"QUENX_BACKEND", "QUENX_ADAPTERS", "QUENX_ADAPTER_STATE"})
-            ::unsetenv(name);
-        for (const auto& [name, value] : m_old)
-            ::setenv(name.c_str(), value.c_str(), 1);
+    ~BackendsTest() override {
+        choose(m_before);
         ma::setBackend(m_backend);
+    }
+    /// These variables, and no others of those that choose adapters. No backend is chosen then.
+    static void choose(const Values& values) {
+        for (const char* name : kVariables) {
+            const auto value = values.find(name);
+            if (value == values.end())
+                ::unsetenv(name);
+            else
+                ::setenv(name, value->second.c_str(), 1);
+        }
+        ma::setBackend(nullptr);
     }
 
   private:
-    Values m_old;
-    std::shared_ptr<ma::Backend> m_backend;
+    static constexpr const char* kVariables[] = {"QUENX_BACKEND", "QUENX_ADAPTERS", "QUENX_ADAPTER_STATE"};
+    const std::shared_ptr<ma::Backend> m_backend = ma::setBackend(nullptr);
+    Values m_before;
 };
 
 bool installsOnEth0() {
@@ -75,14 +76,14 @@ std::string searchOf(const ma::BackendChoice& choice) try {
     return error.what();
 }
 
-TEST(BackendsTest, AreChosenByWhatIsSaidThenByTheEnvironment) {
+TEST_F(BackendsTest, AreChosenByWhatIsSaidThenByTheEnvironment) {
     const test::TempFolder folder;
     const std::string five = folder.write("five.toml", test::kTestAdapters);
     const std::string none = folder.write("none.toml", "");
     const std::string missing = folder / "missing.toml";
     const std::string wrong = folder.write("wrong.toml", "adapter = 1");
     const struct {
-        ChoosingVariables::Values variables;
+        Values variables;
         ma::BackendChoice choice;
         std::string expected;
     } table[] = {
@@ -90,7 +91,6 @@ TEST(BackendsTest, AreChosenByWhatIsSaidThenByTheEnvironment) {
         {{{"QUENX_ADAPTERS", five}}, {.backend = "auto"}, five + ", which describes 5."},
         {{{"QUENX_ADAPTERS", five}}, {.description = none}, none + ", which describes 0."},
         {{{"QUENX_BACKEND", "simulator"}, {"QUENX_ADAPTERS", five}}, {}, five + ", which describes 5."},
-        {{{"QUENX_BACKEND", "simulation"}}, {.description = five}, five + ", which describes 5."},
         {{{"QUENX_BACKEND", "simulation"}},
          {},
          "QUENX_BACKEND: there is no backend \"simulation\"; it must be "},
@@ -108,15 +108,15 @@ TEST(BackendsTest, AreChosenByWhatIsSaidThenByTheEnvironment) {
         {{}, {.backend = "devlink", .description = five}, "simulated adapters are described in " + five},
     };
     for (const auto& [variables, choice, expected] : table) {
-        const ChoosingVariables chosen(variables);
+        choose(variables);
         EXPECT_NE(std::string::npos, searchOf(choice).find(expected)) << searchOf(choice) << "\n" << expected;
     }
 }
 
-TEST(BackendsTest, StayUntilTheNextOneIsThere) {
+TEST_F(BackendsTest, StayUntilTheNextOneIsThere) {
     const test::SimulatedAdapters adapters;
-    const ChoosingVariables none({{"QUENX_ADAPTERS", adapters.folder() / "late.toml"},
-                                  {"QUENX_ADAPTER_STATE", adapters.stateDirectory()}});
+    choose({{"QUENX_ADAPTERS", adapters.folder() / "late.toml"},
+            {"QUENX_ADAPTER_STATE", adapters.stateDirectory()}});
     // A mistake is told at each call until it is mended.
     EXPECT_THROW(ma::enumerateAdapters(), ma::AdapterError);
     EXPECT_THROW(ma::enumerateAdapters(), ma::AdapterError);
@@ -130,14 +130,14 @@ TEST(BackendsTest, StayUntilTheNextOneIsThere) {
         << "the state is that of the variable";
 }
 
-TEST(BackendsTest, AreThoseOfTheSystemWhereNothingIsSaid) {
+TEST_F(BackendsTest, AreThoseOfTheSystemWhereNothingIsSaid) {
     const bool canMount =
         test::run({"/usr/bin/unshare", "-m", "/bin/mount", "--bind", kPciDevices, kPciDevices}).status == 0;
     if (!canMount) GTEST_SKIP() << "nothing can be mounted";
     const test::TempFolder root;
     const auto answers = [&root] {
         standInForTheSystem(root);
-        const ChoosingVariables none({});
+        choose({});
         const bool isEmpty = ma::enumerateAdapters().empty();
         std::ofstream("/etc/quenx-adapters.toml") << test::kTestAdapters;
         ma::setBackend(nullptr);
@@ -149,14 +149,13 @@ TEST(BackendsTest, AreThoseOfTheSystemWhereNothingIsSaid) {
         std::ofstream(function + "/class") << "0x020000\n";
         ma::setBackend(nullptr);
         const bool isReal = ma::enumerateAdapters() == utils::StringArray{"0000:05:00.0"};
-        ::setenv("QUENX_ADAPTERS", "/etc/quenx-adapters.toml", 1);
-        ma::setBackend(nullptr);
+        choose({{"QUENX_ADAPTERS", "/etc/quenx-adapters.toml"}});
         return isEmpty && isSimulated && isReal && ma::enumerateAdapters().size() == 5;
     };
     EXPECT_EXIT(::_exit(answers() ? 0 : 1), testing::ExitedWithCode(0), "");
 }
 
-TEST(BackendsTest, AnswersUntilTheProcessHasEnded) {
+TEST_F(BackendsTest, AnswersUntilTheProcessHasEnded) {
     // As a provider that is still loaded then: its destructor waits for the flash that runs.
     const auto provider = [] {
         if (ma::enumerateAdapters().size() != 5 || !installsOnEth0()) ::_exit(1);

@@ -24,10 +24,10 @@ class DevlinkActivationTest : public ::testing::Test {
     }
     test::FakeDevice& device() const { return m_bench.device(); }
     void putLink(bool isUp) const {
-        m_bench.kernel->files["/sys/class/net/enp5s0f0/carrier"] = isUp ? "1" : "0";
+        m_bench.kernel->put("/sys/class/net/enp5s0f0/carrier", isUp ? "1" : "0");
     }
     void putDefaultRoute() const {
-        m_bench.kernel->files["/proc/net/route"] = "enp5s0f0 00000000 00000000 0003 0 0 0 00000000 0 0 0";
+        m_bench.kernel->put("/proc/net/route", "enp5s0f0 00000000 00000000 0003 0 0 0 00000000 0 0 0");
     }
     ma::Activation activate(const ma::ActivationRequest& request = {}) const {
         return ma::activate(m_bench.first, request);
@@ -74,7 +74,7 @@ TEST_F(DevlinkActivationTest, TellsWhatHasNotComeBack) {
 
 TEST_F(DevlinkActivationTest, TellsWhyNothingWasActivated) {
     device().activationError = EIO;
-    device().duringReset = [this] { m_bench.kernel->folders.clear(); };
+    device().duringReset = [this] { m_bench.kernel->drop("/sys/bus/pci/devices/0000:05:00.0/net"); };
     const ma::Activation failed = activate();
     EXPECT_EQ(ma::Activation::Failed, failed.status);
     EXPECT_THAT(failed.text, HasSubstr("Input/output error; 0000:05:00.0 has no network interface"));
@@ -92,23 +92,6 @@ TEST_F(DevlinkActivationTest, TellsWhyNothingWasActivated) {
     m_bench.kernel->isPermitted = false;
     EXPECT_THAT(activate().text, HasSubstr("run it as root"));
     EXPECT_THROW(ma::activate("0000:09:00.0", {}), ma::AdapterError);
-}
-
-TEST_F(DevlinkActivationTest, IsNotToldApartFromARestartWhereTheDriverTellsNothing) {
-    device().stored.clear();
-    EXPECT_EQ(ma::ResetNeeded::Unknown, resetNeeded());
-}
-
-TEST_F(DevlinkActivationTest, LeavesTheJudgementOfImagesToTheDriver) {
-    const auto verdict = ma::judgeImage(m_bench.first, m_bench.image, {});
-    ASSERT_TRUE(verdict);
-    EXPECT_EQ(ma::Prepared, verdict->status);
-    EXPECT_EQ(3U, verdict->unchecked.size());
-    EXPECT_EQ(ma::InvalidParameter, ma::judgeImage(m_bench.first, {}, {})->status);
-    m_bench.kernel->readOnly.insert("/lib/firmware");
-    const auto hindered = ma::judgeImage(m_bench.first, m_bench.image, {});
-    EXPECT_EQ(ma::UnspecifiedError, hindered->status);
-    EXPECT_THAT(hindered->reason, HasSubstr("may not write to any of"));
 }
 
 }  // namespace

@@ -6,11 +6,13 @@
 #include <thread>
 
 #include "MidAPI/Devlink/DevlinkBench.h"
-#include "MidAPI/Devlink/FlashProgress.h"
+#include "MidAPI/Devlink/StagedImage.h"
+#include "Support/SyslogCapture.h"
 #include "Support/Together.h"
 
 namespace {
 
+using testing::ElementsAre;
 using testing::HasSubstr;
 using enum utils::FirmwareType;
 
@@ -28,19 +30,17 @@ std::uint16_t waitForProgress(const std::string& adapter, std::uint16_t percent)
 
 TEST(DevlinkFlashTest, StagesFlashesAndCleansUp) {
     const test::DevlinkBench bench;
-    bench.kernel->files["/lib/firmware/quenx/0000:05:00-left.bin"] = "of a process that was killed";
-    bench.kernel->files["/lib/firmware/quenx/0000:06:00-other.bin"] = "of another card";
+    bench.kernel->put("/lib/firmware/quenx/0000:05:00-left.bin", "of a process that was killed");
+    bench.kernel->put("/lib/firmware/quenx/0000:06:00-other.bin", "of another card");
     bench.device().duringFlash = [&] {
         EXPECT_EQ(49, waitForProgress(bench.first, 49)) << "half of what is told before the end";
         EXPECT_EQ(2U, bench.staged().size());
+        bench.kernel->failures["removeFile"] = EROFS;  // which leaves this one
     };
     EXPECT_EQ("1.2.3", storedVersion(bench.first));
     const test::WriteResult result = bench.install();
     EXPECT_TRUE(result.done && result.code == 0 && result.text.empty()) << result.text;
-    EXPECT_THAT(bench.kernel->flashed, testing::ElementsAre(":image"));
-    EXPECT_THAT(bench.kernel->flashedFiles,
-                testing::ElementsAre(testing::StartsWith("/lib/firmware/quenx/0000:05:00-")));
-    EXPECT_THAT(bench.staged(), testing::ElementsAre("0000:06:00-other.bin"));
+    EXPECT_EQ(2U, bench.staged().size());
     EXPECT_EQ(100, ma::getFlashImageUpdateProgress(bench.first));
     EXPECT_EQ(0, ma::getFlashImageUpdateProgress(bench.second));
 
@@ -50,65 +50,161 @@ TEST(DevlinkFlashTest, StagesFlashesAndCleansUp) {
     EXPECT_TRUE(code == 0 && text.empty());
     EXPECT_EQ("1.3.0", storedVersion(bench.first));
     EXPECT_EQ(ma::ResetNeeded::Unknown, ma::getAdapterInfo(bench.first).resetNeeded);
+    bench.kernel->failures.clear();
+    bench.device().statuses = {{"more than there is", 11, 10}};
+    bench.device().duringFlash = [&] {
+        EXPECT_EQ(99, waitForProgress(bench.first, 99));
+        EXPECT_EQ(0, ma::getFlashImageUpdateProgress(bench.second));
+        EXPECT_EQ(2U, bench.staged().size());
+    };
     EXPECT_EQ(0, bench.prepare());
     EXPECT_EQ(0, ma::getFlashImageUpdateProgress(bench.first));
+    EXPECT_TRUE(bench.write().done);
+    EXPECT_THAT(bench.staged(), ElementsAre("0000:06:00-other.bin"));
+    EXPECT_THAT(bench.kernel->flashed, ElementsAre(":image", ":image"));
+    const auto isStaged = testing::StartsWith("/lib/firmware/quenx/0000:05:00-");
+    EXPECT_THAT(bench.kernel->flashedFiles, ElementsAre(isStaged, isStaged));
+    EXPECT_NE(bench.kernel->flashedFiles[0], bench.kernel->flashedFiles[1]);
 }
 
-TEST(DevlinkFlashTest, TellsWhyAFlashFailedAndLeavesNothingBehind) {
-    struct Case {
-        std::function<void(test::FakeKernel&, test::FakeDevice&)> spoil;
-        std::uint32_t code;
-        std::string text;
-    };
-    const auto failing = [](const char* operation, int error) {
-        return [=](test::FakeKernel& kernel, test::FakeDevice&) { kernel.failures[operation] = error; };
-    };
-    const auto ending = [](int error, const char* text) {
-        return [=](test::FakeKernel&, test::FakeDevice& device) {
-            device.error = error;
-            device.errorText = text;
-        };
-    };
-    const std::vector<Case> cases = {
-        {ending(EIO, "erasing bank 1 failed"), EIO, "erasing bank 1 failed (Input/output error)"},
-        {ending(EIO, ""), EIO, "Input/output error; the driver's last words were: Flashing done"},
-        {ending(ENOENT, "failed to locate the requested firmware file"), ENOENT, "outside a container"},
-        {[](auto& kernel, auto&) { kernel.isPermitted = false; }, EPERM, "run it as root"},
-        {[](auto& kernel, auto&) { kernel.devices.erase("0000:05:00.0"); }, ENODEV, "The device is gone"},
-        {[](auto& kernel, auto&) { kernel.hasDevlink = false; }, ENODEV, "no devlink"},
-        {[](auto& kernel, auto&) { kernel.readOnly.insert("/lib/firmware"); }, EACCES, "/lib/firmware"},
-        {failing("makeFolder", EROFS), ma::WriteError::DeviceFailed, "makeFolder: Read-only file system"},
-        {failing("lock", EACCES), ma::WriteError::DeviceFailed, "lock: Permission denied"},
-        {failing("createFile", EROFS), EROFS, "createFile: Read-only file system"},
-        {failing("writeFile", ENOSPC), ENOSPC, "writeFile: No space left on device"},
-        {failing("syncFile", EIO), EIO, "syncFile: Input/output error"},
-        {failing("openNetlink", EMFILE), EMFILE, "openNetlink: Too many open files"},
-        {failing("joinGroup", EPERM), EPERM, "joinGroup: Operation not permitted"},
-        {failing("send", ENOBUFS), ENOBUFS, "send: No buffer space available"},
-    };
-    for (const Case& each : cases) {
-        const test::DevlinkBench bench;
-        ASSERT_EQ(0, bench.prepare());
-        const auto devices = bench.kernel->devices;
-        each.spoil(*bench.kernel, bench.device());
-        const test::WriteResult result = bench.write();
-        EXPECT_FALSE(result.done) << each.text;
-        EXPECT_EQ(each.code, result.code) << each.text;
-        EXPECT_THAT(result.text, HasSubstr(each.text));
-        EXPECT_THAT(bench.staged(), testing::IsEmpty()) << each.text;
-        EXPECT_GT(100, ma::getFlashImageUpdateProgress(bench.first)) << each.text;
+std::string chooseFolder(test::FakeKernel& machine, const std::string& configured) try {
+    return "chose " + ma::devlink::chooseFirmwareFolder(machine, configured);
+} catch (const ma::AdapterError& error) {
+    return error.what();
+}
 
-        bench.kernel->failures.clear();
-        bench.kernel->readOnly.clear();
-        bench.kernel->hasDevlink = bench.kernel->isPermitted = true;
-        bench.kernel->devices = devices;
-        EXPECT_TRUE(bench.write().done) << "nothing is held after: " << each.text;
+TEST(DevlinkFlashTest, StagesInTheFirstWritableFolderThatTheKernelSearches) {
+    test::FakeKernel machine;
+    machine.put("/sys/module/firmware_class/parameters/path", "/srv/firmware\n");
+    machine.put("/proc/sys/kernel/osrelease", "6.1.0\n");
+    EXPECT_THAT(ma::devlink::firmwareFolders(machine),
+                ElementsAre("/srv/firmware", "/lib/firmware/updates/6.1.0", "/lib/firmware/updates",
+                            "/lib/firmware/6.1.0", "/lib/firmware"));
+    machine.drop("/lib/firmware");
+    machine.putFolder("/home");
+    EXPECT_THAT(chooseFolder(machine, ""),
+                HasSubstr("may not write to any of /srv/firmware, /lib/firmware/updates"));
+    machine.putFolder("/lib/firmware/updates");
+    EXPECT_EQ("chose /lib/firmware/updates", chooseFolder(machine, ""));
+    machine.readOnly = {"/lib/firmware/updates/quenx"};
+    machine.putFolder("/lib/firmware/updates/quenx");  // the own folder decides where there is one
+    EXPECT_EQ("chose /lib/firmware", chooseFolder(machine, ""));
+    machine.readOnly = {"/lib/firmware/updates"};
+    EXPECT_EQ("chose /lib/firmware/updates", chooseFolder(machine, ""));
+    EXPECT_EQ("chose /lib/firmware", chooseFolder(machine, "/lib/firmware"));
+    EXPECT_THAT(chooseFolder(machine, "/srv/firmware"), HasSubstr("may not write to /srv/firmware."));
+    EXPECT_THAT(chooseFolder(machine, "/home"), HasSubstr("does not look for firmware in /home"));
+}
+
+/// What is wrong with a machine, and what that means before an image is prepared, and after that.
+struct Trouble {
+    std::function<void(test::FakeKernel&, test::FakeDevice&)> spoil;
+    bool canBeUpdated;
+    int status;
+    std::string log;
+    std::uint32_t code;
+    std::string text;
+};
+
+auto failing(const std::string& operation, int error) {
+    return [=](test::FakeKernel& kernel, test::FakeDevice&) { kernel.failures[operation] = error; };
+}
+auto ending(int error, const std::string& text) {
+    return [=](test::FakeKernel&, test::FakeDevice& device) {
+        device.error = error;
+        device.errorText = text;
+    };
+}
+
+void expectBefore(const Trouble& trouble) {
+    const test::SyslogCapture log;
+    const test::DevlinkBench bench;
+    trouble.spoil(*bench.kernel, bench.device());
+    EXPECT_EQ(trouble.canBeUpdated, ma::getCanBeUpdated(bench.first));
+    const std::string search = ma::describeSearch();
+    EXPECT_THAT(search, HasSubstr(": 2 were found."));
+    EXPECT_EQ(trouble.canBeUpdated,
+              search.find(bench.first + " (fake) cannot be updated: ") == std::string::npos)
+        << search;
+    const auto verdict = ma::judgeImage(bench.first, bench.image, {});
+    EXPECT_EQ(trouble.status, verdict->status);
+    EXPECT_THAT(verdict->reason, HasSubstr(trouble.log));
+    EXPECT_EQ(trouble.status, bench.prepare());
+    EXPECT_TRUE(trouble.log.empty() || log.contains(trouble.log)) << trouble.log;
+    EXPECT_EQ(2U, ma::enumerateAdapters().size());
+}
+
+void expectDuring(const Trouble& trouble) {
+    const test::DevlinkBench bench;
+    ASSERT_EQ(0, bench.prepare());
+    const auto devices = bench.kernel->devices;
+    trouble.spoil(*bench.kernel, bench.device());
+    const test::WriteResult result = bench.write();
+    EXPECT_EQ(trouble.code == 0, result.done);
+    EXPECT_EQ(trouble.code, result.code);
+    EXPECT_THAT(result.text, HasSubstr(trouble.text));
+    EXPECT_THAT(bench.staged(), testing::IsEmpty());
+    EXPECT_EQ(result.done, ma::getFlashImageUpdateProgress(bench.first) == 100);
+
+    bench.kernel->failures.clear();
+    bench.kernel->readOnly.clear();
+    bench.kernel->mangle = {};
+    bench.kernel->hasDevlink = bench.kernel->isPermitted = true;
+    bench.kernel->devices = devices;
+    EXPECT_TRUE(bench.write().done) << "nothing is held";
+}
+
+TEST(DevlinkFlashTest, TellsWhatIsWrongAndLeavesNothingBehind) {
+    using enum ma::PrepareStatus;
+    using enum ma::WriteError;
+    const std::vector<Trouble> troubles = {
+        {[](auto&, auto&) {}, true, Prepared, "", 0, ""},
+        {[](auto&, auto& device) { device.hasInfo = false; }, true, Prepared, "", 0, ""},
+        {[](auto&, auto& device) { device.hasFlash = false; }, false, ImageNotSupported, "", EOPNOTSUPP,
+         "Operation not supported"},
+        {[](auto& kernel, auto&) { kernel.devices.erase("0000:05:00.0"); }, false, ImageNotSupported, "",
+         ENODEV, "The device is gone"},
+        {[](auto& kernel, auto&) { kernel.hasDevlink = false; }, false, ImageNotSupported, "", ENODEV,
+         "no devlink"},
+        {[](auto& kernel, auto&) { kernel.isPermitted = false; }, false, UnspecifiedError, "run it as root",
+         EPERM, "run it as root"},
+        {[](auto& kernel, auto&) { kernel.mangle = [](test::Datagram& datagram) { datagram.resize(1); }; },
+         false, UnspecifiedError, "does not say whether it has devlink", ETIMEDOUT,
+         "does not say whether it has devlink"},
+        {[](auto& kernel, auto&) { kernel.readOnly.insert("/lib/firmware"); }, true, UnspecifiedError,
+         "/lib/firmware", EACCES, "/lib/firmware"},
+        {failing("openNetlink", EMFILE), false, UnspecifiedError, "Too many open files", EMFILE,
+         "openNetlink: Too many open files"},
+        {failing("joinGroup", EPERM), false, UnspecifiedError, "Operation not permitted", EPERM,
+         "joinGroup: Operation not permitted"},
+        {failing("send", ENOBUFS), false, UnspecifiedError, "No buffer space", ENOBUFS,
+         "send: No buffer space available"},
+        {ending(EIO, "erasing bank 1 failed"), true, Prepared, "", EIO,
+         "erasing bank 1 failed (Input/output error)"},
+        {ending(EIO, ""), true, Prepared, "", EIO,
+         "Input/output error; the driver's last words were: Flashing done"},
+        {ending(ENOENT, "failed to locate the requested firmware file"), true, Prepared, "", ENOENT,
+         "outside a container"},
+        {failing("makeFolder", EROFS), true, Prepared, "", DeviceFailed, "makeFolder: Read-only file"},
+        {failing("lock", EACCES), true, Prepared, "", DeviceFailed, "lock: Permission denied"},
+        {failing("createFile", EROFS), true, Prepared, "", EROFS, "createFile: Read-only file system"},
+        {failing("writeFile", ENOSPC), true, Prepared, "", ENOSPC, "writeFile: No space left on device"},
+        {failing("syncFile", EIO), true, Prepared, "", EIO, "syncFile: Input/output error"},
+        {failing("syncFolder", EIO), true, Prepared, "", EIO, "syncFolder: Input/output error"},
+    };
+    for (const Trouble& trouble : troubles) {
+        SCOPED_TRACE(trouble.text);
+        expectBefore(trouble);
+        expectDuring(trouble);
     }
 }
 
 TEST(DevlinkFlashTest, WritesOnlyWhatWasPreparedForTheAdapter) {
     const test::DevlinkBench bench;
     EXPECT_EQ(ma::WriteError::BadImage, bench.write().code);
+    EXPECT_EQ(3U, ma::judgeImage(bench.first, bench.image, {})->unchecked.size());
+    EXPECT_EQ(ma::InvalidParameter, ma::judgeImage(bench.first, {}, {})->status);
+    EXPECT_EQ(ma::WriteError::BadImage, bench.write().code) << "a judgement prepares nothing";
     ASSERT_EQ(0, bench.prepare());
     EXPECT_EQ(ma::WriteError::BadImage, test::writeImage(bench.first, {'I', 'm', 'a', 'g', 'e'}).code);
     EXPECT_EQ(ma::WriteError::BadImage, test::writeImage(bench.second, bench.image).code);
@@ -159,13 +255,15 @@ TEST(DevlinkFlashTest, FlashesACardFromOnePlaceAtATime) {
         }
     };
     EXPECT_TRUE(bench.install().done);
-    EXPECT_THAT(codes, testing::ElementsAre(ma::WriteError::Busy, ma::WriteError::Busy, 0));
+    EXPECT_THAT(codes, ElementsAre(ma::WriteError::Busy, ma::WriteError::Busy, 0));
     EXPECT_TRUE(test::writeImage(bench.second, bench.image).done);
 }
 
 TEST(DevlinkFlashTest, FlashesComponentsOneAfterTheOther) {
     const test::DevlinkBench bench;
     bench.device().components = {"fw.undi", "fw.uefi"};
+    // No step that is not counted, or begins anew, takes it back.
+    bench.device().statuses = {{"Flashing", UINT64_MAX / 2, UINT64_MAX}, {"Verifying"}, {"Sealing", 0, 10}};
     EXPECT_EQ(ma::PrepareStatus::ImageNotApplicable, bench.prepare({PXE, iSCSI}));
     ASSERT_EQ(0, bench.prepare({UEFI, PXE, None, UEFI}));
     std::vector<int> percents;
@@ -173,8 +271,8 @@ TEST(DevlinkFlashTest, FlashesComponentsOneAfterTheOther) {
         percents.push_back(waitForProgress(bench.first, bench.kernel->flashed.empty() ? 24 : 74));
     };
     EXPECT_TRUE(bench.write().done);
-    EXPECT_THAT(percents, testing::ElementsAre(24, 74));
-    EXPECT_THAT(bench.kernel->flashed, testing::ElementsAre("fw.undi:image", "fw.uefi:image"));
+    EXPECT_THAT(percents, ElementsAre(24, 74));
+    EXPECT_THAT(bench.kernel->flashed, ElementsAre("fw.undi:image", "fw.uefi:image"));
     EXPECT_EQ(100, ma::getFlashImageUpdateProgress(bench.first));
 
     bench.kernel->flashed.clear();
@@ -195,26 +293,6 @@ TEST(DevlinkFlashTest, OutlivesAStormOfNotifications) {
     EXPECT_TRUE(bench.install().done);
     EXPECT_EQ(100, ma::getFlashImageUpdateProgress(bench.first));
     EXPECT_TRUE(ma::getCanBeUpdated(bench.first)) << "asked anew after some were lost";
-}
-
-TEST(DevlinkFlashTest, MakesOnePercentageOfWhatDriversTell) {
-    ma::Progress progress;
-    ma::devlink::FlashProgress flash(progress, 2);
-    progress.begin();
-    const auto after = [&](std::uint64_t done, std::uint64_t total) {
-        flash.report({.text = "", .done = done, .total = total, .timeout = 0});
-        return progress.percent();
-    };
-    EXPECT_EQ(0, after(7, 0));
-    EXPECT_EQ(24, after(5, 10));
-    EXPECT_EQ(24, after(0, 10)) << "the driver's next step";
-    EXPECT_EQ(49, after(11, 10)) << "more than there is";
-    flash.partDone();
-    EXPECT_EQ(50, progress.percent());
-    EXPECT_EQ(74, after(UINT64_MAX / 2, UINT64_MAX));
-    EXPECT_EQ(99, after(UINT64_MAX, UINT64_MAX));
-    flash.partDone();
-    EXPECT_EQ(100, progress.percent());
 }
 
 TEST(DevlinkFlashTest, CallsNothingDoneThatTheKernelDidNotDo) {

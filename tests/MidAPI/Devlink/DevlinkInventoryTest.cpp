@@ -7,7 +7,6 @@
 
 #include "MidAPI/Devlink/DevlinkBench.h"
 #include "Support/NetlinkGuard.h"
-#include "Support/SyslogCapture.h"
 #include "Support/Together.h"
 
 namespace {
@@ -23,8 +22,17 @@ TEST(DevlinkInventoryTest, TellsWhatKernelAndDriverTell) {
     const test::DevlinkBench bench;
     bench.device().serial = "AB12";
     bench.device().boardSerial = "CD34";
+    bench.device().fixed["board.id"] = "K12";
+    bench.device().running[""] = "of nothing";
     bench.device().stored["fw"] = "1.3.0";
-    bench.kernel->files["/sys/class/net/enp5s0f0/address"] = "52:54:00:12:34:56";
+    const auto putState = [&](const std::string& name, const char* mac, const char* speed, const char* link) {
+        bench.kernel->putFolder("/sys/bus/pci/devices/" + bench.first + "/net/" + name);
+        bench.kernel->put("/sys/class/net/" + name + "/address", mac);
+        bench.kernel->put("/sys/class/net/" + name + "/speed", speed);
+        bench.kernel->put("/sys/class/net/" + name + "/carrier", link);
+    };
+    putState("enp5s0f0", "52:54:00:12:34:5f", "25000", "0");
+    putState("enp5s0f0x", "52:54:00:12:34:60", "-1", "1");
     EXPECT_THAT(ma::enumerateAdapters(), ElementsAre(bench.first, bench.second));
     EXPECT_EQ((utils::PCIAddr{5, 0, 1, false, bench.second}), ma::getPCIAddress(bench.second));
     const ma::AdapterInfo info = ma::getAdapterInfo(bench.first);
@@ -32,11 +40,17 @@ TEST(DevlinkInventoryTest, TellsWhatKernelAndDriverTell) {
     EXPECT_EQ("fake", info.driver);
     EXPECT_EQ("AB12", info.serialNumber);
     EXPECT_EQ("CD34", info.boardSerialNumber);
-    EXPECT_EQ(0x56, info.permanentMac[5]);
-    EXPECT_THAT(info.interfaces, ElementsAre("enp5s0f0"));
-    EXPECT_THAT(info.versions, ElementsAre(ma::NamedVersion{"fw", "", "1.2.3", "1.3.0"}));
+    EXPECT_THAT(info.permanentMac, ElementsAre(0x52, 0x54, 0, 0x12, 0x34, 0x5f)) << "the first one's";
+    EXPECT_EQ(25'000'000'000U, info.speed);
+    EXPECT_TRUE(info.linkUp) << "of either";
+    EXPECT_THAT(info.interfaces, ElementsAre("enp5s0f0", "enp5s0f0x"));
+    EXPECT_THAT(info.versions, ElementsAre(ma::NamedVersion{"board.id", "K12", "", ""},
+                                           ma::NamedVersion{"fw", "", "1.2.3", "1.3.0"}));
     EXPECT_EQ(ma::ResetNeeded::Unknown, info.resetNeeded);
     EXPECT_EQ(ma::ResetNeeded::None, ma::getAdapterInfo(bench.second).resetNeeded);
+    bench.device().stored.clear();
+    bench.kernel->notify(DEVLINK_CMD_NEW, bench.first);
+    EXPECT_EQ(ma::ResetNeeded::Unknown, ma::getAdapterInfo(bench.first).resetNeeded);
 
     std::vector<utils::FirmwareVersionInfo> components;
     EXPECT_TRUE(ma::getAdapterFirmwareVersion(bench.first, components));
@@ -46,49 +60,6 @@ TEST(DevlinkInventoryTest, TellsWhatKernelAndDriverTell) {
     EXPECT_THROW(ma::getAdapterInfo("eth0"), ma::AdapterError);
     EXPECT_THROW(ma::getPCIAddress("eth0"), ma::AdapterError);
     EXPECT_FALSE(ma::setBootType(bench.first, ma::BootType::None));
-}
-
-TEST(DevlinkInventoryTest, SaysWhatCanBeUpdatedAndPreparesNothingElse) {
-    struct Case {
-        std::function<void(test::FakeKernel&, test::FakeDevice&)> arrange;
-        bool canBeUpdated;
-        int status;
-        std::string log;
-    };
-    const std::vector<Case> cases = {
-        {[](auto&, auto&) {}, true, ma::PrepareStatus::Prepared, ""},
-        {[](auto&, auto& device) { device.hasInfo = false; }, true, ma::PrepareStatus::Prepared, ""},
-        {[](auto&, auto& device) { device.hasFlash = false; }, false, ma::PrepareStatus::ImageNotSupported,
-         ""},
-        {[](auto& kernel, auto&) { kernel.devices.clear(); }, false, ma::PrepareStatus::ImageNotSupported,
-         ""},
-        {[](auto& kernel, auto&) { kernel.hasDevlink = false; }, false, ma::PrepareStatus::ImageNotSupported,
-         ""},
-        {[](auto& kernel, auto&) { kernel.isPermitted = false; }, false, ma::PrepareStatus::UnspecifiedError,
-         "run it as root"},
-        {[](auto& kernel, auto&) { kernel.failures["openNetlink"] = EAFNOSUPPORT; }, false,
-         ma::PrepareStatus::UnspecifiedError, "Address family not supported"},
-        {[](auto& kernel, auto&) { kernel.failures["send"] = ENOBUFS; }, false,
-         ma::PrepareStatus::UnspecifiedError, "No buffer space"},
-        {[](auto& kernel, auto&) { kernel.mangle = [](test::Datagram& datagram) { datagram.resize(1); }; },
-         false, ma::PrepareStatus::UnspecifiedError, "does not say whether it has devlink"},
-        {[](auto& kernel, auto&) { kernel.readOnly.insert("/lib/firmware"); }, true,
-         ma::PrepareStatus::UnspecifiedError, "/lib/firmware"},
-    };
-    for (const Case& each : cases) {
-        const test::SyslogCapture log;
-        const test::DevlinkBench bench;
-        each.arrange(*bench.kernel, bench.device());
-        EXPECT_EQ(each.canBeUpdated, ma::getCanBeUpdated(bench.first)) << each.log;
-        const std::string search = ma::describeSearch();
-        EXPECT_NE(std::string::npos, search.find(": 2 were found.")) << search;
-        EXPECT_EQ(each.canBeUpdated,
-                  search.find(bench.first + " (fake) cannot be updated: ") == std::string::npos)
-            << search;
-        EXPECT_EQ(each.status, bench.prepare()) << each.log;
-        EXPECT_TRUE(each.log.empty() || log.contains(each.log)) << each.log;
-        EXPECT_EQ(2U, ma::enumerateAdapters().size()) << each.log;
-    }
 }
 
 TEST(DevlinkInventoryTest, AsksADeviceOnceUntilItChanges) {
@@ -120,8 +91,7 @@ TEST(DevlinkInventoryTest, AsksADeviceOnceUntilItChanges) {
 
     bench.kernel->add("0000:06:00.0");
     EXPECT_TRUE(ma::getCanBeUpdated("0000:06:00.0")) << "plugged in";
-    for (const char* file : {"/class", "/vendor"})
-        bench.kernel->files.erase("/sys/bus/pci/devices/0000:06:00.0" + std::string(file));
+    bench.kernel->drop("/sys/bus/pci/devices/0000:06:00.0");
     EXPECT_EQ(2U, ma::enumerateAdapters().size()) << "pulled out";
     EXPECT_FALSE(ma::getCanBeUpdated("0000:06:00.0"));
 }

@@ -1,15 +1,16 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "MidAPI/Devlink/FakeKernel.h"
 
-#include <fcntl.h>
 #include <linux/devlink.h>
 #include <linux/genetlink.h>
 #include <linux/netlink.h>
 #include <sys/socket.h>
 
 #include <cerrno>
-#include <cstring>
+#include <filesystem>
 #include <system_error>
+
+#include "MidAPI/Devlink/GenericNetlink.h"
 
 namespace test {
 
@@ -19,25 +20,25 @@ constexpr std::uint16_t kFamily = 21;
 constexpr std::uint32_t kGroup = 6;
 const std::string kFirmware = "/lib/firmware/";
 
-/// Puts messages together, by the layout alone: the fake shares no code with what it tests.
+/// Puts messages together, by the layout alone: the fake shares no code with what reads it.
 class Writer {
   public:
-    template <class Number>
-    Writer& number(Number value) {
-        const auto* const bytes = reinterpret_cast<const std::uint8_t*>(&value);
-        m_bytes.insert(m_bytes.end(), bytes, bytes + sizeof value);
+    Writer& bytes(const Datagram& bytes) {
+        m_bytes.insert(m_bytes.end(), bytes.begin(), bytes.end());
         return *this;
     }
+    template <class Number>
+    Writer& number(Number value) {
+        const auto* const first = reinterpret_cast<const std::uint8_t*>(&value);
+        return bytes({first, first + sizeof value});
+    }
     Writer& attribute(std::uint16_t type, const Datagram& payload) {
-        number(static_cast<std::uint16_t>(payload.size() + 4)).number(type);
-        m_bytes.insert(m_bytes.end(), payload.begin(), payload.end());
+        number(static_cast<std::uint16_t>(payload.size() + 4)).number(type).bytes(payload);
         m_bytes.resize((m_bytes.size() + 3) / 4 * 4);
         return *this;
     }
     Writer& text(std::uint16_t type, const std::string& value) {
-        Datagram payload(value.begin(), value.end());
-        payload.push_back(0);
-        return attribute(type, payload);
+        return attribute(type, Datagram(value.c_str(), value.c_str() + value.size() + 1));
     }
     template <class Number>
     Writer& value(std::uint16_t type, Number number) {
@@ -50,111 +51,71 @@ class Writer {
 };
 
 Datagram message(std::uint16_t type, std::uint16_t flags, std::uint32_t sequence, const Datagram& payload) {
-    Datagram result = Writer()
-                          .number(static_cast<std::uint32_t>(16 + payload.size()))
-                          .number(type)
-                          .number(flags)
-                          .number(sequence)
-                          .number(std::uint32_t{0})
-                          .take();
-    result.insert(result.end(), payload.begin(), payload.end());
-    return result;
+    Writer header;
+    header.number(static_cast<std::uint32_t>(16 + payload.size())).number(type).number(flags);
+    return header.number(sequence).number(std::uint32_t{0}).bytes(payload).take();
 }
 
 Datagram familyMessage(std::uint16_t family, std::uint8_t command, std::uint32_t sequence, Writer& content) {
-    Datagram payload{command, 1, 0, 0};
-    const Datagram attributes = content.take();
-    payload.insert(payload.end(), attributes.begin(), attributes.end());
-    return message(family, 0, sequence, payload);
+    return message(family, 0, sequence, Writer().bytes({command, 1, 0, 0}).bytes(content.take()).take());
 }
 
 }  // namespace
 
 /// What a request holds: every attribute of ours is a text, or is not looked at.
 struct FakeKernel::Request {
-    std::uint16_t family = 0;
-    std::uint8_t command = 0;
-    std::uint32_t sequence = 0;
+    ma::devlink::Message message;
     std::map<std::uint16_t, std::string> texts;
     std::map<std::uint16_t, std::uint32_t> offsets;
 
-    explicit Request(std::span<const std::uint8_t> bytes) {
-        std::memcpy(&family, bytes.data() + 4, sizeof family);
-        std::memcpy(&sequence, bytes.data() + 8, sizeof sequence);
-        command = bytes[16];
-        for (std::size_t at = 20; at < bytes.size();) {
-            std::uint16_t length = 0;
-            std::uint16_t type = 0;
-            std::memcpy(&length, &bytes[at], sizeof length);
-            std::memcpy(&type, &bytes[at + 2], sizeof type);
-            texts[type] = reinterpret_cast<const char*>(&bytes[at + 4]);
-            offsets[type] = static_cast<std::uint32_t>(at);
-            at += (length + 3U) / 4 * 4;
+    explicit Request(std::span<const std::uint8_t> bytes) : message(ma::devlink::readMessages(bytes).at(0)) {
+        for (const auto& [type, payload] : ma::devlink::readAttributes(message.attributes())) {
+            texts[type] = reinterpret_cast<const char*>(payload.data());
+            offsets[type] = static_cast<std::uint32_t>(payload.data() - bytes.data() - 4);
         }
     }
 };
 
+FakeKernel::FakeKernel() {
+    for (const char* folder : {"/lib/firmware", "/var/lib"})
+        putFolder(folder);
+}
+
 FakeDevice& FakeKernel::add(const std::string& address, const std::string& interface) {
     const std::string folder = "/sys/bus/pci/devices/" + address;
-    files[folder + "/class"] = "0x020000";
-    files[folder + "/vendor"] = "0x1af4";
-    files[folder + "/device"] = "0x1041";
-    files[folder + "/subsystem_vendor"] = "0x1af4";
-    files[folder + "/subsystem_device"] = "0x1100";
-    links[folder + "/driver"] = "../../../bus/pci/drivers/fake";
-    if (!interface.empty()) folders.insert(folder + "/net/" + interface);
+    put(folder + "/class", "0x020000");
+    put(folder + "/vendor", "0x1af4");
+    put(folder + "/device", "0x1041");
+    put(folder + "/subsystem_vendor", "0x1af4");
+    put(folder + "/subsystem_device", "0x1100");
+    drop(folder + "/driver");
+    std::filesystem::create_symlink("../../../bus/pci/drivers/fake", in(folder + "/driver"));
+    if (!interface.empty()) putFolder(folder + "/net/" + interface);
     return devices[address];
 }
 
-void FakeKernel::failIfTold(const std::string& operation) const {
+void FakeKernel::put(const std::string& path, const std::string& content) const {
+    putFolder(path.substr(0, path.rfind('/')));
+    m_root.write(path.substr(1), content);
+}
+
+void FakeKernel::putFolder(const std::string& path) const {
+    std::filesystem::create_directories(in(path));
+}
+
+void FakeKernel::drop(const std::string& path) const {
+    std::filesystem::remove_all(in(path));
+}
+
+std::string FakeKernel::may(const std::string& operation, const std::string& path) const {
     const auto failure = failures.find(operation);
     if (failure != failures.end())
         throw std::system_error(failure->second, std::generic_category(), operation);
-}
-
-std::string FakeKernel::lockPath(const std::string& path) const {
-    return m_locks / path.substr(path.rfind('/') + 1);
-}
-
-std::optional<std::string> FakeKernel::readFile(const std::string& path) {
-    if (reading) reading(path);
-    const std::lock_guard lock(m_mutex);
-    if (path.ends_with(".lock")) return ma::devlink::LinuxMachine().readFile(lockPath(path));
-    const auto file = files.find(path);
-    return file == files.end() ? std::nullopt : std::optional(file->second);
-}
-
-std::optional<std::string> FakeKernel::readLink(const std::string& path) {
-    const auto link = links.find(path);
-    return link == links.end() ? std::nullopt : std::optional(link->second);
-}
-
-utils::StringArray FakeKernel::listFolder(const std::string& path) {
-    const std::lock_guard lock(m_mutex);
-    const std::string prefix = path.ends_with('/') ? path : path + '/';
-    std::set<std::string> names;
-    const auto take = [&](const std::string& entry) {
-        if (!entry.starts_with(prefix)) return;
-        const std::string rest = entry.substr(prefix.size());
-        names.insert(rest.substr(0, rest.find('/')));
-    };
-    for (const auto& [name, content] : files)
-        take(name);
-    for (const std::string& name : folders)
-        take(name);
-    return {names.begin(), names.end()};
-}
-
-bool FakeKernel::folderExists(const std::string& path) {
-    return folders.contains(path) || !listFolder(path).empty();
-}
-
-bool FakeKernel::folderIsWritable(const std::string& path) {
-    return folderExists(path) && !readOnly.contains(path);
+    return in(path);
 }
 
 os::Descriptor FakeKernel::openNetlink() {
-    failIfTold("openNetlink");
+    may("openNetlink");
     int ends[2] = {-1, -1};
     if (::socketpair(AF_UNIX, SOCK_SEQPACKET | SOCK_CLOEXEC, 0, ends) != 0)
         throw std::system_error(errno, std::generic_category(), "socketpair");
@@ -165,7 +126,7 @@ os::Descriptor FakeKernel::openNetlink() {
 }
 
 void FakeKernel::joinGroup(const os::Descriptor& socket, std::uint32_t group) {
-    failIfTold("joinGroup");
+    may("joinGroup");
     const std::lock_guard lock(m_mutex);
     if (group == kGroup) m_sockets.at(socket.number()).isListening = true;
 }
@@ -205,13 +166,13 @@ std::optional<std::size_t> FakeKernel::receive(const os::Descriptor& socket, std
         if (std::exchange(m_sockets.at(socket.number()).hasOverrun, false))
             throw std::system_error(ENOBUFS, std::generic_category(), "receive");
     }
-    return ma::devlink::LinuxMachine().receive(socket, buffer, patience);
+    return LinuxMachine::receive(socket, buffer, patience);
 }
 
 void FakeKernel::send(const os::Descriptor& socket, std::span<const std::uint8_t> message) {
-    failIfTold("send");
+    may("send");
     const Request request(message);
-    if (request.family == GENL_ID_CTRL)
+    if (request.message.type == GENL_ID_CTRL)
         resolveFamily(socket.number(), request);
     else
         handle(socket.number(), request);
@@ -221,12 +182,12 @@ void FakeKernel::acknowledge(int socket, const Request& request, int error, cons
                              std::uint16_t attribute, std::uint32_t value) {
     Writer content;
     content.number(-error);
-    content.number(std::uint32_t{20}).number(request.family).number(std::uint16_t{5});
-    content.number(request.sequence).number(std::uint32_t{0});
+    content.number(std::uint32_t{20}).number(request.message.type).number(std::uint16_t{5});
+    content.number(request.message.sequence).number(std::uint32_t{0});
     if (!text.empty()) content.text(NLMSGERR_ATTR_MSG, text);
     if (attribute != 0) content.value(attribute, value);
     constexpr std::uint16_t kFlags = NLM_F_CAPPED | NLM_F_ACK_TLVS;
-    answer(socket, message(NLMSG_ERROR, kFlags, request.sequence, content.take()));
+    answer(socket, message(NLMSG_ERROR, kFlags, request.message.sequence, content.take()));
 }
 
 void FakeKernel::resolveFamily(int socket, const Request& request) {
@@ -239,7 +200,7 @@ void FakeKernel::resolveFamily(int socket, const Request& request) {
     content.text(CTRL_ATTR_FAMILY_NAME, "devlink").value(CTRL_ATTR_FAMILY_ID, kFamily);
     content.attribute(CTRL_ATTR_MCAST_GROUPS | NLA_F_NESTED,
                       Writer().attribute(1 | NLA_F_NESTED, other).attribute(2 | NLA_F_NESTED, group).take());
-    answer(socket, familyMessage(GENL_ID_CTRL, CTRL_CMD_NEWFAMILY, request.sequence, content));
+    answer(socket, familyMessage(GENL_ID_CTRL, CTRL_CMD_NEWFAMILY, request.message.sequence, content));
     acknowledge(socket, request, 0);
 }
 
@@ -251,14 +212,14 @@ std::recursive_mutex& FakeKernel::lockOf(const std::string& address) {
 
 void FakeKernel::handle(int socket, const Request& request) {
     const std::lock_guard lock(lockOf(request.texts.at(DEVLINK_ATTR_DEV_NAME)));
-    const bool isFlash = request.command == DEVLINK_CMD_FLASH_UPDATE;
-    const bool isReset = request.command == DEVLINK_CMD_RELOAD;
+    const bool isFlash = request.message.command() == DEVLINK_CMD_FLASH_UPDATE;
+    const bool isReset = request.message.command() == DEVLINK_CMD_RELOAD;
     if ((isFlash || isReset) && !isPermitted) return acknowledge(socket, request, EPERM);
     const auto device = devices.find(request.texts.at(DEVLINK_ATTR_DEV_NAME));
     if (device == devices.end()) return acknowledge(socket, request, ENODEV);
     if (isFlash) return flash(socket, request, device->second);
     if (isReset) return reset(socket, request, device->second);
-    if (request.command == DEVLINK_CMD_GET) return tellDevice(socket, request, device->second);
+    if (request.message.command() == DEVLINK_CMD_GET) return tellDevice(socket, request, device->second);
     tellInfo(socket, request, device->second);
 }
 
@@ -275,9 +236,10 @@ void FakeKernel::tellInfo(int socket, const Request& request, const FakeDevice& 
                                                        .text(DEVLINK_ATTR_INFO_VERSION_VALUE, version)
                                                        .take());
     };
+    versions(DEVLINK_ATTR_INFO_VERSION_FIXED, device.fixed);
     versions(DEVLINK_ATTR_INFO_VERSION_RUNNING, device.running);
     versions(DEVLINK_ATTR_INFO_VERSION_STORED, device.stored);
-    answer(socket, familyMessage(kFamily, request.command, request.sequence, content));
+    answer(socket, familyMessage(kFamily, request.message.command(), request.message.sequence, content));
     acknowledge(socket, request, 0);
 }
 
@@ -298,7 +260,7 @@ void FakeKernel::tellDevice(int socket, const Request& request, const FakeDevice
                           .attribute(DEVLINK_ATTR_REMOTE_RELOAD_STATS | NLA_F_NESTED,
                                      counts(DEVLINK_RELOAD_ACTION_FW_ACTIVATE))
                           .take());
-    answer(socket, familyMessage(kFamily, DEVLINK_CMD_NEW, request.sequence, content));
+    answer(socket, familyMessage(kFamily, DEVLINK_CMD_NEW, request.message.sequence, content));
     acknowledge(socket, request, 0);
 }
 
@@ -343,47 +305,6 @@ void FakeKernel::flash(int socket, const Request& request, FakeDevice& device) {
     if (device.error == 0 && !device.stored.empty()) device.stored["fw"] = device.storedAfterwards;
     if (device.tellsEnd) notify(DEVLINK_CMD_FLASH_UPDATE_END, address);
     if (device.isAcknowledged) acknowledge(socket, request, device.error, device.errorText);
-}
-
-void FakeKernel::makeFolder(const std::string& path) {
-    failIfTold("makeFolder");
-    const std::lock_guard lock(m_mutex);
-    folders.insert(path);
-}
-
-os::Descriptor FakeKernel::createFile(const std::string& path) {
-    failIfTold("createFile");
-    os::Descriptor file(::open("/dev/null", O_WRONLY | O_CLOEXEC));
-    const std::lock_guard lock(m_mutex);
-    if (!files.emplace(path, "").second)
-        throw std::system_error(EEXIST, std::generic_category(), "createFile " + path);
-    m_openFiles[file.number()] = path;
-    return file;
-}
-
-void FakeKernel::writeFile(const os::Descriptor& file, std::span<const std::uint8_t> bytes) {
-    failIfTold("writeFile");
-    const std::lock_guard lock(m_mutex);
-    files.at(m_openFiles.at(file.number())).append(bytes.begin(), bytes.end());
-}
-
-void FakeKernel::syncFile(const os::Descriptor&) {
-    failIfTold("syncFile");
-}
-
-void FakeKernel::syncFolder(const std::string&) {
-    failIfTold("syncFolder");
-}
-
-void FakeKernel::removeFile(const std::string& path) {
-    failIfTold("removeFile");
-    const std::lock_guard lock(m_mutex);
-    files.erase(path);
-}
-
-std::unique_ptr<os::FileLock> FakeKernel::lock(const std::string& path, std::chrono::milliseconds) {
-    failIfTold("lock");
-    return std::make_unique<os::FileLock>(lockPath(path));
 }
 
 }  // namespace test

@@ -23,6 +23,7 @@ struct FakeDevice {
     bool hasInfo = true;
     std::string serial;
     std::string boardSerial;
+    std::map<std::string, std::string> fixed{};
     std::map<std::string, std::string> running{{"fw", "1.2.3"}};
     std::map<std::string, std::string> stored{{"fw", "1.2.3"}};
     std::set<std::string> components;  ///< that can be flashed by themselves
@@ -46,18 +47,24 @@ struct FakeDevice {
     std::function<void()> duringReset;
 };
 
-/// A machine of a test's own: files in memory, and a kernel that answers devlink on the other end of each
-/// socket. It does what it is asked for within the sending, as the real one does. Thread-safe but for what a
-/// test changes itself.
-class FakeKernel : public ma::devlink::Machine {
+/// A machine of a test's own: files below a folder of its own, and a kernel that answers devlink on the other
+/// end of each socket. It does what it is asked for within the sending, as the real one does. Thread-safe but
+/// for what a test changes itself.
+class FakeKernel : public ma::devlink::LinuxMachine {
   public:
-    /// A function of class 0x0200 with a driver and a device; more of its files can be added to `files`.
-    FakeDevice& add(const std::string& address, const std::string& interface = "");
+    /// Has the folders /lib/firmware and /var/lib.
+    FakeKernel();
 
-    std::map<std::string, std::string> files;                    ///< path and content
-    std::map<std::string, std::string> links;                    ///< path and target
-    std::set<std::string> folders{"/lib/firmware", "/var/lib"};  ///< beside those of the files
-    std::set<std::string> readOnly;                              ///< folders
+    /// A function of class 0x0200 with a driver and a device.
+    FakeDevice& add(const std::string& address, const std::string& interface = "");
+    /// Makes a file, and the folders on the way.
+    void put(const std::string& path, const std::string& content) const;
+    void putFolder(const std::string& path) const;
+    /// Removes a file, or a folder with all that is in it.
+    void drop(const std::string& path) const;
+    std::string in(const std::string& path) const { return m_root.path() + path; }
+
+    std::set<std::string> readOnly;             ///< folders
     std::map<std::string, int> failures;        ///< operation and the errno value that it fails with
     std::map<std::string, FakeDevice> devices;  ///< by address
     bool hasDevlink = true;
@@ -71,11 +78,36 @@ class FakeKernel : public ma::devlink::Machine {
     /// Tells all who listen.
     void notify(std::uint8_t command, const std::string& address, const FakeDevice::Status* status = nullptr);
 
-    std::optional<std::string> readFile(const std::string& path) override;
-    std::optional<std::string> readLink(const std::string& path) override;
-    utils::StringArray listFolder(const std::string& path) override;
-    bool folderExists(const std::string& path) override;
-    bool folderIsWritable(const std::string& path) override;
+    std::optional<std::string> readFile(const std::string& path) override {
+        if (reading) reading(path);
+        return LinuxMachine::readFile(in(path));
+    }
+    std::optional<std::string> readLink(const std::string& path) override {
+        return LinuxMachine::readLink(in(path));
+    }
+    utils::StringArray listFolder(const std::string& path) override {
+        return LinuxMachine::listFolder(in(path));
+    }
+    bool folderExists(const std::string& path) override { return LinuxMachine::folderExists(in(path)); }
+    bool folderIsWritable(const std::string& path) override {
+        return folderExists(path) && !readOnly.contains(path);
+    }
+    void makeFolder(const std::string& path) override { LinuxMachine::makeFolder(may("makeFolder", path)); }
+    os::Descriptor createFile(const std::string& path) override {
+        return LinuxMachine::createFile(may("createFile", path));
+    }
+    void writeFile(const os::Descriptor& file, std::span<const std::uint8_t> bytes) override {
+        may("writeFile");
+        LinuxMachine::writeFile(file, bytes);
+    }
+    // What is on the medium nobody looks at here, and it takes its time.
+    void syncFile(const os::Descriptor&) override { may("syncFile"); }
+    void syncFolder(const std::string&) override { may("syncFolder"); }
+    void removeFile(const std::string& path) override { LinuxMachine::removeFile(may("removeFile", path)); }
+    std::unique_ptr<os::FileLock> lock(const std::string& path, std::chrono::milliseconds) override {
+        return LinuxMachine::lock(may("lock", path), std::chrono::milliseconds(0));
+    }
+
     os::Descriptor openNetlink() override;
     void joinGroup(const os::Descriptor& socket, std::uint32_t group) override;
     void send(const os::Descriptor& socket, std::span<const std::uint8_t> message) override;
@@ -83,13 +115,6 @@ class FakeKernel : public ma::devlink::Machine {
                                        std::chrono::milliseconds patience) override;
     /// What it answers is there when the sending is over.
     std::chrono::milliseconds patience() const override { return std::chrono::milliseconds(1); }
-    void makeFolder(const std::string& path) override;
-    os::Descriptor createFile(const std::string& path) override;
-    void writeFile(const os::Descriptor& file, std::span<const std::uint8_t> bytes) override;
-    void syncFile(const os::Descriptor& file) override;
-    void syncFolder(const std::string& path) override;
-    void removeFile(const std::string& path) override;
-    std::unique_ptr<os::FileLock> lock(const std::string& path, std::chrono::milliseconds patience) override;
 
   private:
     struct Socket {
@@ -99,8 +124,8 @@ class FakeKernel : public ma::devlink::Machine {
     };
     struct Request;
 
-    void failIfTold(const std::string& operation) const;
-    std::string lockPath(const std::string& path) const;
+    /// Fails where the test says so. Returns where the path really is.
+    std::string may(const std::string& operation, const std::string& path = "") const;
     void deliver(Socket& socket, const Datagram& datagram) const;
     void answer(int socket, const Datagram& datagram);
     std::recursive_mutex& lockOf(const std::string& address);
@@ -113,12 +138,11 @@ class FakeKernel : public ma::devlink::Machine {
     void acknowledge(int socket, const Request& request, int error, const std::string& text = "",
                      std::uint16_t attribute = 0, std::uint32_t value = 0);
 
-    TempFolder m_locks;
+    const TempFolder m_root;
     std::mutex m_mutex;
     // The kernel's own: whoever asks about a device waits for its flash. A test may ask within one.
     std::map<std::string, std::recursive_mutex> m_deviceLocks;
     std::map<int, Socket> m_sockets;
-    std::map<int, std::string> m_openFiles;
 };
 
 }  // namespace test

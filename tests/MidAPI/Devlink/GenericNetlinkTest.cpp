@@ -7,8 +7,6 @@
 
 #include <cerrno>
 
-#include "MidAPI/Devlink/DevlinkMessages.h"
-
 namespace {
 
 using namespace ma::devlink;
@@ -46,6 +44,7 @@ TEST(GenericNetlinkTest, ReadsAttributesUntilOneDoesNotFit) {
     ASSERT_EQ(3U, attributes.size());
     EXPECT_EQ("xyz", attributes[0].text());
     EXPECT_EQ(2, attributes[1].type);
+    EXPECT_EQ("A", attributes[1].text()) << "a text may lack its NUL";
     EXPECT_EQ(0x41, attributes[1].number<std::uint8_t>());
     EXPECT_EQ(std::nullopt, attributes[1].number<std::uint16_t>());
     EXPECT_TRUE(attributes[2].payload.empty());
@@ -101,21 +100,6 @@ TEST(GenericNetlinkTest, SplitsDatagramsIntoMessages) {
     const Bytes empty = bytes("10000000 1500 0000 07000000 00000000");
     EXPECT_EQ(0, readMessages(empty).at(0).command());
     EXPECT_TRUE(readMessages(empty).at(0).attributes().empty());
-}
-
-TEST(DevlinkMessagesTest, JoinsAVersionsKindsByItsName) {
-    // "fw" runs 1 and stores 2, "id" is fixed as A; a version without a name is none.
-    const Bytes info = bytes(
-        "1400 6580 0700 6700 66770000 0600 6800 31000000"
-        "1400 6680 0600 6800 32000000 0700 6700 66770000"
-        "1400 6480 0700 6700 69640000 0600 6800 41000000"
-        "0c00 6580 0600 6800 39000000"
-        "0800 6200 66616b65");
-    const DeviceInfo read = readDeviceInfo(info);
-    ASSERT_EQ(2U, read.versions.size());
-    EXPECT_EQ((ma::NamedVersion{"fw", "", "1", "2"}), read.versions[0]);
-    EXPECT_EQ((ma::NamedVersion{"id", "A", "", ""}), read.versions[1]);
-    EXPECT_EQ("fake", read.driver) << "a text may lack its NUL";
 }
 
 }  // namespace

@@ -35,21 +35,21 @@ class NetworkUseTest : public ::testing::Test {
   protected:
     /// Puts `upper` on `lower`.
     void stack(const std::string& upper, const std::string& lower) {
-        m_machine.folders.insert("/sys/class/net/" + lower + "/upper_" + upper);
+        m_machine.putFolder("/sys/class/net/" + lower + "/upper_" + upper);
     }
     void bond(const std::string& name, const Names& slaves, const std::string& down = "") {
-        m_machine.files["/sys/class/net/" + name + "/bonding/slaves"] = utils::joined(slaves, " ");
+        m_machine.put("/sys/class/net/" + name + "/bonding/slaves", utils::joined(slaves, " "));
         for (const std::string& slave : slaves) {
             stack(name, slave);
-            m_machine.files["/sys/class/net/" + slave + "/bonding_slave/mii_status"] =
-                slave == down ? "down" : "up";
+            m_machine.put("/sys/class/net/" + slave + "/bonding_slave/mii_status",
+                          slave == down ? "down" : "up");
         }
     }
     ma::CardUse use(const Names& interfaces, const std::string& caller = "") {
         ma::CardUse found;
         found.interfaces = interfaces;
-        m_machine.files["/proc/net/route"] = m_routesV4;
-        m_machine.files["/proc/net/ipv6_route"] = m_routesV6;
+        m_machine.put("/proc/net/route", m_routesV4);
+        m_machine.put("/proc/net/ipv6_route", m_routesV6);
         ma::devlink::findNetworkUse(m_machine, caller, found);
         return found;
     }
@@ -60,20 +60,14 @@ class NetworkUseTest : public ::testing::Test {
     std::string m_routesV6;
 };
 
-TEST_F(NetworkUseTest, IsNothingForAnInterfaceOfItsOwn) {
-    const ma::CardUse found = use({"eth0"}, "192.0.2.7");
-    EXPECT_THAT(found.bonds, IsEmpty());
-    EXPECT_THAT(found.bridges, IsEmpty());
-    EXPECT_THAT(found.losses, IsEmpty());
-}
-
 TEST_F(NetworkUseTest, FollowsBridgesAndVlansToTheDefaultRoute) {
     stack("eth0.7", "eth0");
     stack("br0", "eth0.7");
-    m_machine.files["/sys/class/net/br0/bridge/forward_delay"] = "0";
+    m_machine.put("/sys/class/net/br0/bridge/forward_delay", "0");
     m_routesV4 += routeV4("br0", 0, 0, 100) + routeV4("wlan0", 0, 0, 600) + routeV4("wlan0", 0, 0, 0, 0x203);
     const ma::CardUse found = use({"eth0"});
     EXPECT_THAT(found.bridges, ElementsAre("br0"));
+    EXPECT_THAT(found.bonds, IsEmpty());
     EXPECT_THAT(found.losses, ElementsAre("the default route goes through br0"));
     EXPECT_THAT(use({"wlan0"}).losses, IsEmpty());  // its route is the worse one
 }
@@ -109,7 +103,7 @@ TEST_F(NetworkUseTest, FindsTheConnectionOfWhoAsks) {
 TEST_F(NetworkUseTest, TellsWhichLinksHaveNotComeBack) {
     const auto put = [this](const std::string& number, const std::string& interface, bool isUp) {
         m_machine.add("0000:0" + number + ":00.0", interface);
-        if (isUp) m_machine.files["/sys/class/net/" + interface + "/carrier"] = "1";
+        if (isUp) m_machine.put("/sys/class/net/" + interface + "/carrier", "1");
     };
     Names functions;
     for (const std::string number : {"1", "2", "3", "4"}) {
@@ -118,12 +112,11 @@ TEST_F(NetworkUseTest, TellsWhichLinksHaveNotComeBack) {
     }
     // Of the card's switch, not the function's own.
     put("1", "eth1_0", true);
-    m_machine.files["/sys/class/net/eth1_0/phys_port_name"] = "pf0vf0";
+    m_machine.put("/sys/class/net/eth1_0/phys_port_name", "pf0vf0");
     const auto before = ma::devlink::linksOf(m_machine, functions);
     EXPECT_EQ(4U, before.size());
     EXPECT_THAT(ma::devlink::missingLinks(m_machine, before), IsEmpty());
-    m_machine.folders.clear();
-    m_machine.files.clear();
+    m_machine.drop("/sys");
     put("1", "eth1", false);
     put("2", "renamed", true);
     put("4", "eth4", false);
@@ -133,14 +126,15 @@ TEST_F(NetworkUseTest, TellsWhichLinksHaveNotComeBack) {
 
 TEST(CallerTest, IsWhoLoggedInToAnAncestor) {
     test::FakeKernel machine;
-    machine.files = {{"/proc/self/environ", "A=1"},
-                     {"/proc/self/status", "Name:\tx\nPPid:\t7\nUid:\t0"},
-                     {"/proc/7/status", "PPid:\t1"},
-                     {"/proc/1/status", "PPid:\t0"}};
+    machine.put("/proc/self/environ", "A=1");
+    machine.put("/proc/self/status", "Name:\tx\nPPid:\t7\nUid:\t0");
+    machine.put("/proc/7/status", "PPid:\t1");
+    machine.put("/proc/1/status", "PPid:\t0");
     EXPECT_EQ("", ma::devlink::findCaller(machine));
-    machine.files["/proc/7/environ"] = std::string("A=1\0SSH_CONNECTION=192.0.2.7 5000 192.0.2.1 22\0B=", 50);
+    machine.put("/proc/7/environ", std::string("A=1\0SSH_CONNECTION=192.0.2.7 5000 192.0.2.1 22\0B=", 50));
     EXPECT_EQ("192.0.2.7", ma::devlink::findCaller(machine));
-    machine.files = {{"/proc/self/status", "PPid:\tself"}};  // a ring, as no system has it
+    machine.drop("/proc/7/environ");
+    machine.put("/proc/self/status", "PPid:\tself");  // a ring, as no system has it
     EXPECT_EQ("", ma::devlink::findCaller(machine));
 }
 
