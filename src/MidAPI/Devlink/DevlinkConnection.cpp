@@ -9,6 +9,8 @@
 #include <cerrno>
 #include <system_error>
 
+#include "Utils/Log.h"
+
 namespace ma::devlink {
 namespace {
 
@@ -61,10 +63,15 @@ Answer DevlinkConnection::exchange(std::uint16_t family, RequestWriter request) 
         return std::max(std::chrono::floor<std::chrono::milliseconds>(end - Clock::now()),
                         std::chrono::milliseconds(0));
     };
-    Answer answer;
-    // What has come by then is read, too: an answer is of two datagrams.
-    while (const auto datagram = receive(m_machine, m_socket, rest()))
-        if (read(*datagram, family, answer)) return answer;
+    try {
+        Answer answer;
+        // What has come by then is read, too: an answer is of two datagrams.
+        while (const auto datagram = receive(m_machine, m_socket, rest()))
+            if (read(*datagram, family, answer)) return answer;
+    } catch (const std::system_error& error) {
+        // An answer that cannot be read is as good as none: the request may have been done.
+        QUENX_ERROR("what the kernel answers to a request cannot be read: %s", error.what());
+    }
     return {.isLost = true};
 }
 
