@@ -68,13 +68,19 @@ std::string chooseFirmwareFolder(Machine& machine, const std::string& configured
         throw AdapterError("The kernel does not look for firmware in " + configured +
                            ", the firmware_folder of the settings. Name one of " + utils::joined(folders) +
                            ".");
-    for (const std::string& folder : folders) {
-        const bool isMeant = configured.empty() || folder == configured;
-        if (isMeant && takesImages(machine, folder)) return folder;
+    utils::StringArray missing;
+    utils::StringArray closed;
+    for (const std::string& folder : configured.empty() ? folders : utils::StringArray{configured}) {
+        if (takesImages(machine, folder)) return folder;
+        (machine.folderExists(folder) ? closed : missing).push_back(folder);
     }
-    throw AdapterError("No image can be given to the kernel: this process may not write to " +
-                       (configured.empty() ? "any of " + utils::joined(folders) : configured) +
-                       ". Make one of the kernel's firmware folders writable to it.");
+    const std::string what = "No image can be given to the kernel: ";
+    if (closed.empty())
+        throw AdapterError(what + "it looks for firmware in " + utils::joined(missing) +
+                           (missing.size() == 1 ? ", which is not there" : ", of which none is there") +
+                           ". Make the folder " + missing.back() + ".");
+    throw AdapterError(what + "this process may not write to " + utils::joined(closed) + ". Make " +
+                       (closed.size() == 1 ? "it" : "one of them") + " writable, or run this as root.");
 }
 
 StagedImage::StagedImage(Machine& machine, const std::string& folder, std::string_view card,

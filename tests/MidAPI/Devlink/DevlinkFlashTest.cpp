@@ -84,7 +84,7 @@ TEST(DevlinkFlashTest, StagesInTheFirstWritableFolderThatTheKernelSearches) {
     machine.drop("/lib/firmware");
     machine.putFolder("/home");
     EXPECT_THAT(chooseFolder(machine, ""),
-                HasSubstr("may not write to any of /srv/firmware, /lib/firmware/updates"));
+                testing::EndsWith("/lib/firmware, of which none is there. Make the folder /lib/firmware."));
     machine.putFolder("/lib/firmware/updates");
     EXPECT_EQ("chose /lib/firmware/updates", chooseFolder(machine, ""));
     machine.readOnly = {"/lib/firmware/updates/quenx"};
@@ -93,7 +93,11 @@ TEST(DevlinkFlashTest, StagesInTheFirstWritableFolderThatTheKernelSearches) {
     machine.readOnly = {"/lib/firmware/updates"};
     EXPECT_EQ("chose /lib/firmware/updates", chooseFolder(machine, ""));
     EXPECT_EQ("chose /lib/firmware", chooseFolder(machine, "/lib/firmware"));
-    EXPECT_THAT(chooseFolder(machine, "/srv/firmware"), HasSubstr("may not write to /srv/firmware."));
+    EXPECT_THAT(chooseFolder(machine, "/srv/firmware"), HasSubstr("in /srv/firmware, which is not there."));
+    machine.readOnly.insert("/lib/firmware");
+    machine.drop("/lib/firmware/updates/quenx");
+    EXPECT_THAT(chooseFolder(machine, ""),
+                HasSubstr("may not write to /lib/firmware/updates, /lib/firmware. "));
     EXPECT_THAT(chooseFolder(machine, "/home"), HasSubstr("does not look for firmware in /home"));
 }
 
