@@ -86,17 +86,6 @@ ExitStatus statusFor(core::CimStatus status) {
     return isMissing ? ExitStatus::NotFound : ExitStatus::Failed;
 }
 
-/// An error text of the model or a server, which may be no more than a few words, as a sentence. What begins
-/// with a path or a name of code keeps its letters.
-std::string sentence(std::string text) {
-    if (text.empty()) return "The service gave no reason.";
-    const std::size_t end = std::string_view(text).find_first_of(" :=.");
-    if (text.front() >= 'a' && text.front() <= 'z' && (end == std::string::npos || text[end] == ' '))
-        text.front() = static_cast<char>(text.front() - 'a' + 'A');
-    if (std::string_view(".!?").find(text.back()) == std::string_view::npos) text += '.';
-    return text;
-}
-
 ExitStatus report(bool json, ExitStatus status, const std::string& what, const std::string& advice) {
     // On standard output: a script reads its one document there, however the verb ended.
     if (json) {

@@ -55,9 +55,11 @@ void selectAdapters(ma::BackendChoice adapters) {
     try {
         ma::selectBackend(adapters);
     } catch (const std::exception& error) {
-        throw CommandError(ExitStatus::WrongUse, error.what(),
-                           adapters.backend ? "Correct --backend, or what it is to use."
-                                            : "Correct the adapter description and try again.");
+        throw CommandError(ExitStatus::WrongUse, sentence(error.what()),
+                           !adapters.backend ? "Correct the adapter description and try again."
+                           : adapters.description
+                               ? "Leave out --backend or --adapters, or correct what they name."
+                               : "Correct --backend; simulated adapters take --adapters with a description.");
     }
 }
 

@@ -49,6 +49,15 @@ Explanation cannotRead(const std::string& file, int error) {
     }
 }
 
+std::string sentence(std::string text) {
+    if (text.empty()) return "The service gave no reason.";
+    const std::size_t end = std::string_view(text).find_first_of(" :=.");
+    if (text.front() >= 'a' && text.front() <= 'z' && (end == std::string::npos || text[end] == ' '))
+        text.front() = static_cast<char>(text.front() - 'a' + 'A');
+    if (std::string_view(".!?").find(text.back()) == std::string_view::npos) text += '.';
+    return text;
+}
+
 std::string didYouMean(std::string_view word, const std::vector<std::string>& known) {
     // The distance takes time and memory by the product of both lengths, and nobody mistypes more than this.
     constexpr std::size_t kLongest = 64;

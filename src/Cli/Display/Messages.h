@@ -58,6 +58,10 @@ class LoginRefused : public CommandError {
 /// Why a file could not be read: `error` is an errno. NotFound for one that is not there.
 Explanation cannotRead(const std::string& file, int error);
 
+/// An error text of the model or a server, which may be no more than a few words, as a sentence. What begins
+/// with a path or a name of code keeps its letters.
+std::string sentence(std::string text);
+
 /// "Did you mean eth0? " for a misspelt word: the one known word that it is nearest to, with a space for what
 /// follows. Empty when none is near, or when several are equally near.
 std::string didYouMean(std::string_view word, const std::vector<std::string>& known);
