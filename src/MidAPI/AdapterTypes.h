@@ -105,6 +105,7 @@ struct AdapterInfo {
     std::vector<NamedVersion> versions = {};  ///< in the driver's order, each name once
     ResetNeeded resetNeeded = ResetNeeded::None;
     std::vector<std::string> interfaces = {};  ///< the network interfaces that run over the port
+    bool isBusy = false;                       ///< somebody is writing to its card, as far as one can tell
 };
 
 /// Which adapters are wanted. What is left open here, the environment may say; see ma::selectBackend().

@@ -89,9 +89,9 @@ QUENX_EXPORT std::optional<ImageVerdict> judgeImage(std::string adapter, std::sp
 ///                at the machine
 QUENX_EXPORT CardUse getCardUse(std::string adapter, const std::string& caller);
 
-/// Puts the firmware in force that is in the port's flash, which resets the card: never done but by this call.
-/// Blocks until the card's interfaces are back, or have been waited for. Throws AdapterError for an unknown
-/// name.
+/// Puts the firmware in force that is in the port's flash, which resets the card: never done but by this
+/// call. Blocks until the card's interfaces are back, or have been waited for. Throws AdapterError for an
+/// unknown name.
 QUENX_EXPORT Activation activate(std::string adapter, const ActivationRequest& request);
 
 /// Selects the backend: for programs that have options or settings for it. Throws AdapterError, which names

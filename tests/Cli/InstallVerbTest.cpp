@@ -58,6 +58,7 @@ class FakeService : public core::CimRequests {
     std::string jobNamespace;
     bool isReadable = true;  ///< what is installed, after the job
     std::string resetNeeded = "None";
+    std::string updateState;
     std::uint32_t refusal = 0;  ///< what the service answers in place of a job
 
     FakeService() : CimRequests("") {}
@@ -66,8 +67,9 @@ class FakeService : public core::CimRequests {
         if (className != "Quenx_EthernetPort") return {};
         return {{CimPath("Quenx_EthernetPort.DeviceID=\"eth0\""),
                  {{"Name", CimValue::of(CimType::String, std::string("eth0")), false, {}},
-                  texts("OtherIdentifyingInfo", {"1af4:1041", resetNeeded}),
-                  texts("IdentifyingDescriptions", {"PCI Vendor and Device ID", "Reset Needed"})}}};
+                  texts("OtherIdentifyingInfo", {"1af4:1041", resetNeeded, updateState}),
+                  texts("IdentifyingDescriptions",
+                        {"PCI Vendor and Device ID", "Reset Needed", "Update State"})}}};
     }
     std::vector<CimPath> enumerateInstanceNames(const std::string& className) override {
         return {CimPath(className + ".Name=\"1\"")};
@@ -311,6 +313,9 @@ TEST_F(CardVerbTest, TellsOfTheCardBeforeAndOfTheResetAfterAnUpdate) {
               }),
               ExitStatus::ResetPending);
     EXPECT_EQ(m_out.str(), "NAME  RESET   FIRMWARE\neth0  reload  IMG_PXE 1, IMG_UEFI 0\n");
+    m_service->updateState = "Busy";
+    run(cli::showAdapters);
+    EXPECT_NE(m_out.str().find("1af4:1041  busy       IMG_PXE 1"), std::string::npos) << m_out.str();
 }
 
 TEST_F(CardVerbTest, RefusesAnImageInTheWordsOfItsBackend) {

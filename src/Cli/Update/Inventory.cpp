@@ -136,6 +136,7 @@ void to_json(Json& json, const Adapter& adapter) {
             {"boardSerialNumber", adapter.boardSerialNumber},
             {"interfaces", adapter.interfaces},
             {"updatable", adapter.updatable},
+            {"busy", adapter.busy},
             {"components", adapter.components},
             {"resetNeeded", adapter.resetNeeded},
             {"path", adapter.path},
@@ -173,6 +174,7 @@ void readMore(Adapter& adapter, const core::InstanceValue& port) {
     adapter.boardSerialNumber = identifyingText(port, "Board Serial Number");
     adapter.interfaces = identifyingTexts(port, "Network Interface");
     adapter.resetNeeded = resetNeededOf(port);
+    adapter.busy = identifyingText(port, "Update State") == "Busy";
 }
 
 }  // namespace

@@ -52,6 +52,7 @@ struct Adapter {
     std::string boardSerialNumber = {};
     std::vector<std::string> interfaces = {};
     std::string resetNeeded = {};  ///< "none", "reload", "reboot", "power cycle", "unknown"
+    bool busy = false;             ///< somebody is writing to its card
 
     /// It has new firmware that does not run yet; false where the adapter does not tell.
     bool waitsForReset() const;

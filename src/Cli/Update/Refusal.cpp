@@ -208,8 +208,9 @@ Reason explainNotApplicable(const Candidate& candidate) {
 Reason explainVerdict(const Candidate& candidate) {
     const ma::ImageVerdict& verdict = *candidate.verdict;
     if (verdict.reason.empty()) return std::nullopt;
-    const std::string message = candidate.adapter.name + " does not take " + candidate.image->path + ": " +
-                                verdict.reason + (verdict.reason.ends_with('.') ? "" : ".");
+    const std::string reason = verdict.reason + (verdict.reason.ends_with('.') ? "" : ".");
+    const std::string message =
+        candidate.adapter.name + " does not take " + candidate.image->path + ": " + reason;
     switch (verdict.status) {
         case ma::PrepareStatus::InvalidParameter:
             return Explanation{message, "Name a complete firmware image."};
@@ -217,6 +218,8 @@ Reason explainVerdict(const Candidate& candidate) {
             return Explanation{message, candidate.adapter.updatable ? getImageFor(candidate.adapter) : ""};
         case ma::PrepareStatus::ImageIsOlder:
             return Explanation{message, "Use a newer image, or install this one with --force."};
+        case ma::PrepareStatus::UnspecifiedError:
+            return Explanation{candidate.adapter.name + " cannot be updated now: " + reason, ""};
         default:
             return Explanation{message, ""};
     }

@@ -113,18 +113,20 @@ ExitStatus showAdapters(Context& context, const VerbOptions& options) {
         {"NAME", "BACKEND", "PCI", "IDS", "UPDATABLE", "FIRMWARE", "DESCRIPTION"}};
     std::vector<std::string> silent;
     for (const Adapter& adapter : adapters) {
-        const std::string firmware = !adapter.answers             ? "?"
-                                     : adapter.components.empty() ? "-"
-                                                                  : componentsText(adapter.components);
-        rows.push_back({adapter.name, adapter.backend, adapter.pciAddress, adapter.ids,
-                        adapter.updatable ? "yes" : "no", firmware, adapter.description});
+        const bool isBusyUnknown = adapter.busy && adapter.components.empty();
+        const std::string firmware = !adapter.answers || isBusyUnknown ? "?"
+                                     : adapter.components.empty()      ? "-"
+                                                                       : componentsText(adapter.components);
+        const std::string updatable = !adapter.updatable ? "no" : adapter.busy ? "busy" : "yes";
+        rows.push_back({adapter.name, adapter.backend, adapter.pciAddress, adapter.ids, updatable, firmware,
+                        adapter.description});
         if (!adapter.answers) silent.push_back(adapter.name);
     }
     printTable(context.out, rows);
     // Why that is so is the next question.
     if (std::ranges::none_of(adapters, &Adapter::updatable)) {
-        const std::string search = searchText(context.connection);
-        if (!search.empty()) context.out << printable(search) << '\n';
+        const std::string advice = adviceForNoAdapters(context.connection);
+        if (!advice.empty()) context.out << printable(advice) << '\n';
     }
     if (!silent.empty())
         context.error << "The firmware of " << printable(joined(silent)) << " cannot be read. "

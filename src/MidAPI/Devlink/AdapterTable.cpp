@@ -32,10 +32,8 @@ std::optional<KnownFunction> AdapterTable::find(const std::string& name) {
     }
     if (!found) return std::nullopt;
     if (!found->mustBeAsked) return found->known;
-    if (isLockedElsewhere(found->known.pci)) {
-        found->known.isBusy = true;
-        return found->known;
-    }
+    found->known.writer = findLockHolder(found->known.pci);
+    if (!found->known.writer.empty()) return found->known;
     ask(name, *found);
     found = look(name);
     return found ? std::optional(found->known) : std::nullopt;
@@ -52,8 +50,9 @@ std::optional<AdapterTable::Found> AdapterTable::look(const std::string& name) {
     if (entry == m_entries.end()) return std::nullopt;
     const auto& [known, isOutOfDate, isFlashedElsewhere, ownFlashes, changes] = entry->second;
     Found found{known, isOutOfDate, changes};
-    found.known.isBusy = isFlashedElsewhere || ownFlashes > 0;
-    if (found.known.isBusy) found.mustBeAsked = false;
+    if (isFlashedElsewhere) found.known.writer = "another process";
+    if (ownFlashes > 0) found.known.writer = "this process";
+    if (!found.known.writer.empty()) found.mustBeAsked = false;
     return found;
 }
 
@@ -155,12 +154,13 @@ void AdapterTable::outdate(Entry& entry) {
 
 /// Another process of this product may have been flashing the card before this one began to listen. While
 /// somebody holds it, there is his number in the lock's file; who may not read it may not flash, either.
-bool AdapterTable::isLockedElsewhere(const PciFunction& function) try {
+std::string AdapterTable::findLockHolder(const PciFunction& function) try {
     const std::string path = CardLock::path(m_lockFolder, function);
-    if (m_machine->readFile(path).value_or("").empty()) return false;
-    return !m_machine->lock(path, std::chrono::milliseconds(0))->isHeld();
+    if (m_machine->readFile(path).value_or("").empty()) return {};
+    const auto lock = m_machine->lock(path, std::chrono::milliseconds(0));
+    return lock->isHeld() ? "" : lock->holder();
 } catch (const std::system_error&) {
-    return false;
+    return {};
 }
 
 AdapterTable::FlashScope::FlashScope(AdapterTable& table, std::string name)

@@ -23,7 +23,7 @@ struct KnownFunction {
     FlashVerdict flash;  ///< Flashable::Unknown also until the device could be asked
     DeviceInfo info;
     bool offersActivation = false;  ///< the driver can put new firmware in force while the machine runs
-    bool isBusy = false;            ///< it is being flashed, by this process or another one
+    std::string writer;             ///< who is flashing it, or its card, for a person; empty for nobody
     std::shared_ptr<Progress> progress = std::make_shared<Progress>();  ///< never null
 };
 
@@ -79,7 +79,7 @@ class QUENX_EXPORT AdapterTable {
     void ask(const std::string& name, const Found& found);
     void askDevice(KnownFunction& known);
     void listen(const Family& family);
-    bool isLockedElsewhere(const PciFunction& function);
+    std::string findLockHolder(const PciFunction& function);
     void note(const Notifications::Batch& batch) QUENX_REQUIRES(m_mutex);
     static void outdate(Entry& entry);
 

@@ -34,16 +34,21 @@ bool canNeverBeUpdated(const FlashVerdict& flash) {
     return flash.flashable == Flashable::NotOffered || flash.flashable == Flashable::Absent;
 }
 
+[[noreturn]] void refuseAsBusy(const std::string& what, const std::string& writer) {
+    throw OperationFailure(WriteError::Busy,
+                           what + " is being written to by " + writer + "; wait until it is done");
+}
+
 /// An answer that a file cannot change.
-void requireFlashable(const FlashVerdict& flash) {
+void requireFlashable(const KnownFunction& known) {
+    const FlashVerdict& flash = known.flash;
     if (canNeverBeUpdated(flash))
         throw OperationFailure(WriteError::NotUpdatable, "this adapter cannot be updated: " + flash.reason);
     if (flash.flashable == Flashable::NotPermitted)
         throw OperationFailure(EPERM, "this process may not update the adapter: " + flash.reason);
-    if (flash.flashable == Flashable::Unknown)
-        throw OperationFailure(WriteError::DeviceFailed,
-                               "the adapter cannot be asked" +
-                                   (flash.reason.empty() ? "; it is busy, try again" : ": " + flash.reason));
+    if (flash.flashable != Flashable::Unknown) return;
+    if (!known.writer.empty()) refuseAsBusy("its card", known.writer);
+    throw OperationFailure(WriteError::DeviceFailed, "the adapter cannot be asked: " + flash.reason);
 }
 
 /// What it takes to run what is in the flash. Where the driver cannot activate it, nothing tells whether a
@@ -85,7 +90,10 @@ utils::PCIAddr DevlinkBackend::getPCIAddress(const std::string& adapter) {
 
 bool DevlinkBackend::getCanBeUpdated(const std::string& adapter) {
     const auto known = m_table.find(adapter);
-    return known && known->flash.flashable == Flashable::Yes;
+    if (!known) return false;
+    // Nobody writes to a card that takes no updates.
+    const bool isOnlyBusy = known->flash.flashable == Flashable::Unknown && !known->writer.empty();
+    return known->flash.flashable == Flashable::Yes || isOnlyBusy;
 }
 
 bool DevlinkBackend::getAdapterFirmwareVersion(const std::string& adapter,
@@ -124,7 +132,7 @@ PackageVerdict DevlinkBackend::assess(const KnownFunction& known, std::span<cons
                                       const std::vector<utils::FirmwareType>& types) {
     const PackageTarget target{
         .ids = known.pci.ids,
-        .canBeUpdated = !canNeverBeUpdated(known.flash),
+        .hindrance = canNeverBeUpdated(known.flash) ? known.flash.reason : "",
         .versions = known.info.versions,
         .largestImage = m_settings.largestImage,
         .table = m_settings.components,
@@ -132,7 +140,7 @@ PackageVerdict DevlinkBackend::assess(const KnownFunction& known, std::span<cons
     PackageVerdict verdict = assessPackage(target, file, types);
     if (!hasOutput(verdict.status)) return verdict;
     // What is wrong with the file comes first: another one is needed whoever writes it.
-    requireFlashable(known.flash);
+    requireFlashable(known);
     stagingFolder();
     for (const std::string& unchecked : verdict.unchecked)
         QUENX_DEBUG("adapter %s: it could not be checked %s", known.pci.address.c_str(), unchecked.c_str());
@@ -140,10 +148,9 @@ PackageVerdict DevlinkBackend::assess(const KnownFunction& known, std::span<cons
 }
 
 bool DevlinkBackend::accepts(const KnownFunction& known, const std::string& component) {
-    requireFlashable(known.flash);
+    requireFlashable(known);
     // The question would wait for the end of a flash.
-    if (known.isBusy)
-        throw OperationFailure(WriteError::Busy, "the adapter is being updated; wait until it is done");
+    if (!known.writer.empty()) refuseAsBusy("its card", known.writer);
     DevlinkConnection connection(*m_machine);
     return refusalOfComponent(connection, known.pci.address, component).empty();
 }
@@ -161,13 +168,10 @@ void DevlinkBackend::write(const std::string& adapter, std::span<const std::uint
     if (!known) throw OperationFailure(WriteError::UnknownAdapter, unknown(adapter));
     FlashOrder order{*known, "", image, preparedComponents(adapter, image)};
     // Said before the lock is tried, which takes rights of its own.
-    if (known->flash.flashable != Flashable::Unknown) requireFlashable(known->flash);
+    if (known->flash.flashable != Flashable::Unknown) requireFlashable(*known);
     const CardLock lock(*m_machine, kLockFolder, known->pci, known->info, kLockPatience);
-    if (!lock.isHeld())
-        throw OperationFailure(WriteError::Busy, "the card of adapter " + adapter +
-                                                     " is being written to by " + lock.holder() +
-                                                     "; wait until it is done");
-    requireFlashable(known->flash);
+    if (!lock.isHeld()) refuseAsBusy("the card of adapter " + adapter, lock.holder());
+    requireFlashable(*known);
     order.folder = stagingFolder();
     const AdapterTable::FlashScope flashing(m_table, adapter);
     const WritingScope writing(*known->progress);
@@ -229,6 +233,7 @@ AdapterInfo DevlinkBackend::getAdapterInfo(const std::string& adapter) {
         version.type = m_settings.components.typeOf(version.name);
     info.resetNeeded = resetNeeded(known);
     info.interfaces = known.pci.interfaces;
+    info.isBusy = !known.writer.empty();
     info.description = "Ethernet adapter " + known.pci.address;
     return info;
 }
@@ -240,8 +245,10 @@ std::string DevlinkBackend::describeSearch() {
     for (const std::string& name : names) {
         const auto known = m_table.find(name);
         if (!known || known->flash.flashable == Flashable::Yes) continue;
-        text += " " + name + " (" + (known->pci.driver.empty() ? "no driver" : known->pci.driver) +
-                ") cannot be updated: " + known->flash.reason + ".";
+        text += " " + name + " (" + (known->pci.driver.empty() ? "no driver" : known->pci.driver) + ") " +
+                (known->writer.empty() ? "cannot be updated: " + known->flash.reason
+                                       : "is being written to by " + known->writer) +
+                ".";
     }
     return text;
 }
@@ -272,6 +279,7 @@ CardUse DevlinkBackend::getCardUse(const std::string& adapter, const std::string
 
 Activation DevlinkBackend::activate(const std::string& adapter, const ActivationRequest& request) try {
     const KnownFunction known = require(adapter);
+    if (known.flash.flashable == Flashable::Absent) return {Activation::NotOffered, known.flash.reason};
     const CardUse use = getCardUse(adapter, request.caller);
     if (!request.mayDisrupt && !use.losses.empty())
         return {Activation::WouldDisrupt, utils::joined(use.losses, "; ")};

@@ -157,8 +157,9 @@ PackageVerdict assessPackage(const PackageTarget& target, std::span<const std::u
                           std::to_string(target.largestImage) + " that are allowed (largest_image)");
     PackageVerdict verdict = assessContent(target, file);
     if (!hasOutput(verdict.status)) return verdict;
-    if (!target.canBeUpdated)
-        return refuse(PrepareStatus::ImageNotSupported, "this adapter cannot be updated");
+    if (!target.hindrance.empty())
+        return refuse(PrepareStatus::ImageNotSupported,
+                      "this adapter cannot be updated: " + target.hindrance);
     verdict.types = distinctTypes(requested);
     if (std::string reason = chooseComponents(target, verdict); !reason.empty())
         return refuse(PrepareStatus::ImageNotApplicable, std::move(reason));

@@ -17,7 +17,7 @@ namespace ma::devlink {
 /// The PCI function that a file is held against.
 struct PackageTarget {
     PciIds ids;
-    bool canBeUpdated = true;
+    std::string hindrance;  ///< why it can never be updated; empty where it can
     std::vector<NamedVersion> versions;
     std::uint32_t largestImage = UINT32_MAX;  ///< bytes
     const ComponentTable& table;

@@ -63,6 +63,8 @@ TEST_F(DevlinkActivationTest, RefusesToCutTheMachineOffUnlessTold) {
     EXPECT_EQ("the default route goes through enp5s0f0", refused.text);
     EXPECT_EQ("1.2.3", device().running["fw"]);
     EXPECT_EQ(ma::Activation::Done, activate({.mayDisrupt = true}).status);
+    m_bench.kernel->hasDevlink = false;
+    EXPECT_EQ("this kernel has no devlink", activate().text) << "and so would cut nothing off";
 }
 
 TEST_F(DevlinkActivationTest, TellsWhatHasNotComeBack) {

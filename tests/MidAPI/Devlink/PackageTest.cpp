@@ -189,11 +189,11 @@ TEST(PldmPackageTest, NamesWhatIsBroken) {
 
 /// What a card 1af4:1041 of subsystem 1af4:1100, which runs fw 1.9 and fw.mgmt 3.1, says to a file: status
 /// and reason, or types and components and what could not be checked.
-std::string answerTo(const Bytes& file, const std::vector<FirmwareType>& types, bool isUpdatable = true,
-                     const ComponentTable& table = {}) {
+std::string answerTo(const Bytes& file, const std::vector<FirmwareType>& types,
+                     const std::string& hindrance = "", const ComponentTable& table = {}) {
     const PackageVerdict verdict = ma::devlink::assessPackage(
         {.ids = {0x1af4, 0x1041, 0x1af4, 0x1100},
-         .canBeUpdated = isUpdatable,
+         .hindrance = hindrance,
          .versions = {{.name = "fw", .running = "1.9"}, {.name = "fw.mgmt", .running = "3.1"}},
          .largestImage = 4096,
          .table = table,
@@ -252,13 +252,13 @@ TEST(PackageVerdictTest, FollowsFromIdsVersionsAndTypes) {
     };
     for (const auto& [file, types, answer] : table)
         EXPECT_EQ(answer, answerTo(file, types));
-    EXPECT_EQ("2 this adapter cannot be updated: ", answerTo(zeros, {}, false));
+    EXPECT_EQ("2 this adapter cannot be updated: it has gone: ", answerTo(zeros, {}, "it has gone"));
     const Bytes olderPart = TestPackage{.images = {{256, "3.0"}}}.bytes();
     EXPECT_EQ("0 : ", answerTo(olderPart, {}));
     ComponentTable components;
     components.set(ComponentTable::PackageRow{256, "fw.mgmt"});
     EXPECT_EQ("3 fw.mgmt would go back from version 3.1 (installed) to 3.0 (in the file): ",
-              answerTo(olderPart, {}, true, components));
+              answerTo(olderPart, {}, "", components));
 }
 
 TEST(DevlinkSettingsTest, AreReadWhole) {
