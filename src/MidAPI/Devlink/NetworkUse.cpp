@@ -70,6 +70,11 @@ bool hasLink(Machine& machine, const std::string& interface) {
     return machine.readFile(netFolder(interface) + "/carrier") == "1";
 }
 
+/// Of an interface without a link. One that nobody has brought up tells nothing of it.
+std::string whyNoLink(Machine& machine, const std::string& interface) {
+    return interface + (machine.readFile(netFolder(interface) + "/carrier") ? " has no link" : " is down");
+}
+
 /// The function's own interfaces: those that stand for virtual functions come and go with these.
 utils::StringArray interfacesOf(const std::vector<PciFunction>& functions, const std::string& address) {
     const auto found = std::ranges::find(functions, address, &PciFunction::address);
@@ -108,7 +113,7 @@ utils::StringArray missingLinks(Machine& machine, const std::vector<LinkState>& 
         if (now.empty())
             missing.push_back(link.function + " has no network interface (before: " + link.interface + ")");
         else if (link.isUp && !(hasName ? isUp(link.interface) : std::ranges::any_of(now, isUp)))
-            missing.push_back((hasName ? link.interface : link.function) + " has no link");
+            missing.push_back(hasName ? whyNoLink(machine, link.interface) : link.function + " has no link");
     }
     return missing;
 }

@@ -121,7 +121,7 @@ TEST_F(NetworkUseTest, TellsWhichLinksHaveNotComeBack) {
     put("2", "renamed", true);
     put("4", "eth4", false);
     EXPECT_THAT(ma::devlink::missingLinks(m_machine, before),
-                ElementsAre("eth1 has no link", "0000:03:00.0 has no network interface (before: eth3)"));
+                ElementsAre("eth1 is down", "0000:03:00.0 has no network interface (before: eth3)"));
 }
 
 TEST(CallerTest, IsWhoLoggedInToAnAncestor) {
