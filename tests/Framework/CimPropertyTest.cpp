@@ -14,29 +14,26 @@ TEST(CimPropertyTest, ChecksAllOfAModificationFirst) {
     core::CimPropertyString::CheckMaxLengthListener longest(5);
     gadget.Caption.addListener(&shortest);
     gadget.Caption.addListener(&longest);
-    const auto modify = [&](const char* name, core::CimValue value) {
+    using enum core::CimType;
+    const auto modify = [&](const char* name, core::CimType type, const core::CimScalar& value) {
         core::CimPropertyList requested;
-        requested.add("Codes", core::CimValue::arrayOf(core::CimType::Uint16, {std::uint64_t{9}}));
-        requested.add(name, value);
+        requested.add("Codes", core::CimValue::arrayOf(Uint16, {std::uint64_t{9}}));
+        requested.add(name, core::CimValue::of(type, value));
         return gadget.modifyInstance(requested);
     };
-    const auto text = [](const char* value) {
-        return core::CimValue::of(core::CimType::String, std::string(value));
-    };
 
-    const auto number = core::CimValue::of(core::CimType::Uint32, std::uint64_t{3});
-    EXPECT_THROW(modify("Caption", text("too long")), core::CimError);
-    EXPECT_THROW(modify("Caption", text("x")), core::CimError);
-    EXPECT_THROW(modify("Caption", number), core::CimError);
-    EXPECT_THROW(modify("ID", text("key")), core::CimError);
-    EXPECT_THROW(modify("Nothing", text("there")), core::CimError);
+    EXPECT_THROW(modify("Caption", String, "too long"), core::CimError);
+    EXPECT_THROW(modify("Caption", String, "x"), core::CimError);
+    EXPECT_THROW(modify("Caption", Uint32, std::uint64_t{3}), core::CimError);
+    EXPECT_THROW(modify("ID", String, "key"), core::CimError);
+    EXPECT_THROW(modify("Nothing", String, "there"), core::CimError);
     EXPECT_TRUE(gadget.Codes.IsNull());
     EXPECT_EQ(gadget.Caption.get(), "Gadget x");
 
-    EXPECT_EQ(modify("caption", text("fits")), 0U);
+    EXPECT_EQ(modify("caption", String, "fits"), 0U);
     EXPECT_EQ(gadget.Caption.get(), "fits");
     EXPECT_EQ(gadget.Codes.get(), std::vector<unsigned short>{9});
-    const auto tooLarge = core::CimValue::arrayOf(core::CimType::Uint32, {std::uint64_t{65536}});
+    const auto tooLarge = core::CimValue::arrayOf(Uint32, {std::uint64_t{65536}});
     EXPECT_THROW(gadget.Codes.setValue(tooLarge), core::CimError);
 }
 

@@ -44,7 +44,6 @@ components = [ { type = "IMG_CLP", revision = 65535 }, { type = "IMG_UEFI" } ])"
 }
 
 TEST(AdapterDescriptionTest, ReadsFaults) {
-    using enum ma::Operation;
     using enum ma::Fault::Action;
     const std::vector<ma::Fault> faults = parsed(adapterWith(R"(fault = [
 { at = "enumerate", action = "fail" }, { at = "pci-address", action = "throw" },
@@ -53,11 +52,9 @@ TEST(AdapterDescriptionTest, ReadsFaults) {
 { at = "boot-type", action = "fail", percent = 7, code = 8, milliseconds = 9, once = true, text = "gone" },
 { at = "info", action = "fail" } ])"))
                                               .faults;
-    const std::pair<ma::Operation, ma::Fault::Action> expected[] = {
-        {Enumerate, Fail}, {PciAddress, Throw},    {FirmwareVersion, Stall}, {Prepare, PowerLoss},
-        {Write, Kill},     {CapabilityWord, Fail}, {BootType, Fail},         {Info, Fail}};
-    for (std::size_t i = 0; i < std::size(expected); ++i)
-        EXPECT_TRUE(faults.at(i).at == expected[i].first && faults[i].action == expected[i].second) << i;
+    const ma::Fault::Action actions[] = {Fail, Throw, Stall, PowerLoss, Kill, Fail, Fail, Fail};
+    for (std::size_t i = 0; i < std::size(actions); ++i)
+        EXPECT_TRUE(faults.at(i).at == static_cast<ma::Operation>(i) && faults[i].action == actions[i]) << i;
     EXPECT_TRUE(faults[6].percent == 7 && faults[6].code == 8 && faults[6].milliseconds == 9);
     EXPECT_TRUE(faults[6].once && faults[6].text == "gone");
     EXPECT_TRUE(faults[7].percent == 0 && faults[7].code == 6 && faults[7].milliseconds == 0);

@@ -3,7 +3,9 @@
 
 #include <algorithm>
 #include <cstring>
+#include <map>
 #include <numeric>
+#include <sstream>
 
 #include "MidAPI/Image/ImagePreparation.h"
 #include "MidAPI/Image/OptionRom.h"
@@ -11,7 +13,9 @@
 #include "MidAPI/ma.h"
 #include "Support/SimulatedAdapters.h"
 #include "Support/SyslogCapture.h"
+#include "Support/TempFolder.h"
 #include "Support/TestRoms.h"
+#include "Utils/Utils.h"
 
 namespace {
 
@@ -67,50 +71,26 @@ TEST(OptionRomTest, TellsNoTypeByBytesThatWritingChanges) {
     }
 }
 
-TEST(OptionRomTest, NamesWhatIsBroken) {
-    constexpr std::size_t PCIR = 0x1C;
-    static const auto notLast = [](Rom& rom) {
-        rom[PCIR + 0x15] = 0;
-        mend(rom);
-    };
-    const std::pair<const char*, void (*)(Rom&)> table[] = {
-        {"image 1 at 0x0: the file is empty (offset 0x0)", [](Rom& rom) { rom.clear(); }},
-        {"ends inside the image header (offset 0x0)", [](Rom& rom) { rom.resize(0x1B); }},
-        {"signature 55 AA is missing (offset 0x0)", [](Rom& rom) { rom[0] = 0x56; }},
-        {"lies outside the image (offset 0x18)", [](Rom& rom) { ma::writeLe16(rom, 0x18, 0xFFF0); }},
-        {"lies outside the image (offset 0x18)", [](Rom& rom) { rom.resize(0x30); }},
-        {"\"PCIR\" (offset 0x1c)", [](Rom& rom) { rom[PCIR] = 'X'; }},
-        {"image length is 0 (offset 0x2c)", [](Rom& rom) { ma::writeLe16(rom, PCIR + 0x10, 0); }},
-        {" 1024 bytes long, but the file has only 1023 left: it is cut short (offset 0x2c)",
-         [](Rom& rom) { rom.resize(1023); }},
-        {"length of the PCI data structure is wrong (offset 0x26)",
-         [](Rom& rom) { ma::writeLe16(rom, PCIR + 0x0A, 0xFFFF); }},
-        {"no end (offset 0x24)", [](Rom& rom) { ma::writeLe16(rom, PCIR + 0x08, 0x8000); }},
-        {"lies inside the PCI data structure (offset 0x24)",
-         [](Rom& rom) { ma::writeLe16(rom, PCIR + 0x08, 27); }},
-        {"no end (offset 0x24)",
-         [](Rom& rom) {
-             ma::writeLe16(rom, PCIR + 0x08, 0x300);
-             std::fill(rom.begin() + 0x300, rom.end(), std::uint8_t{0xFF});
-         }},
-        {"checksum is wrong: the bytes sum to 1, not 0 (offset 0x0)", [](Rom& rom) { ++rom[0x300]; }},
-        {"EFI signature (offset 0x4)", [](Rom& rom) { rom[PCIR + 0x14] = 3; }},
-        {"image that has the last-image bit: it is cut short (offset 0x400)", notLast},
-        {"image 2 at 0x400: the signature 55 AA is missing (offset 0x400)",
-         [](Rom& rom) {
-             notLast(rom);
-             rom.resize(2048);
-         }},
-    };
-    for (const auto& [part, damage] : table) {
-        Rom rom = test::madeRom({{PXE, 1}});
-        damage(rom);
-        const std::string error = ma::parseOptionRom(rom).error.value_or("none");
-        EXPECT_TRUE(error.ends_with(part)) << error << "\nwanted: " << part;
-    }
+/// As a line of the sample says it.
+void breakRom(Rom& rom, const std::string& step) {
+    if (step == "mend") return mend(rom);
+    std::istringstream words(step.starts_with("length ") ? step.substr(7) : step);
+    std::size_t place = 0;
+    words >> std::hex >> place;
+    if (step.starts_with("length ")) return rom.resize(place);
+    for (unsigned int byte = 0; words >> byte; ++place)
+        rom.at(place) = static_cast<std::uint8_t>(byte);
 }
 
-constexpr auto kNoSuch = static_cast<FirmwareType>(77);
+TEST(OptionRomTest, NamesWhatIsBroken) {
+    for (const auto& row : test::readTestTable(QUENX_MIDAPI_TEST_DIR "/samples/broken-images")) {
+        Rom rom = test::madeRom({{PXE, 1}});
+        for (std::size_t i = 1; i < row.size(); ++i)
+            breakRom(rom, row[i]);
+        const std::string error = ma::parseOptionRom(rom).error.value_or("none");
+        EXPECT_TRUE(error.ends_with(row[0])) << error << "\nwanted: " << row[0];
+    }
+}
 
 Rom pxeFor(std::uint16_t device, std::vector<std::uint16_t> others,
            std::uint32_t classCode = ma::rom::kEthernetClass) {
@@ -122,72 +102,55 @@ Rom pxeFor(std::uint16_t device, std::vector<std::uint16_t> others,
                              .classCode = classCode});
 }
 
-Rom cutShort(Rom rom, std::size_t length) {
-    rom.resize(length);
-    return rom;
+Types typesOf(const std::string& words) {
+    const std::vector<std::string> names{"none", "IMG_CLP", "IMG_iSCSI", "IMG_PXE", "IMG_UEFI", "IMG_FCoE"};
+    Types types;
+    for (const std::string& word : utils::split(words, '+')) {
+        const auto number = std::ranges::find(names, word) - names.begin();
+        types.push_back(word == "77" ? FirmwareType(77) : FirmwareType(number));
+    }
+    return types;
 }
 
-struct Case {
-    const char* what;
-    const char* adapter;
-    Rom file;
-    Types requested;
-    int status;
-    Types written;       // what is left in the type list
-    const char* reason;  // a part of the logged line
-};
-
-std::vector<Case> allCases() {
-    const Rom virtio = test::realRom("efi-virtio");
-    const Rom pxeOnly = test::realRom("pxe-virtio");
-    const Rom vmxnet = test::realRom("efi-vmxnet3");
-    const Rom older = test::madeRom({{PXE, 0}, {UEFI, 0}});
-    const Rom newAtZero = test::madeRom({{PXE, 1}, {iSCSI, 0}});
-    const Rom olderAndMore = test::madeRom({{PXE, 0}, {iSCSI, 1}});
-    const Rom clp = test::madeRom({{CLP, 1}});
-    Rom openFirmware = clp;
-    openFirmware[0x1C + ma::rom::kPcirCodeType] = ma::rom::CodeType::OpenFirmware;
-    return {
-        {"equal is fit", "eth0", virtio, {}, 0, {PXE, UEFI}, ""},
-        {"one of two; type 0 and repeats ignored", "eth0", virtio, {PXE, None, PXE}, 0, {PXE}, ""},
-        {"only type 0 stands for all", "eth0", virtio, {None}, 0, {PXE, UEFI}, ""},
-        {"a file with less than the adapter", "eth0", pxeOnly, {}, 0, {PXE}, ""},
-        {"other card", "eth2", virtio, {}, 2, {}, "is for PCI device 1af4:1041, the adapter is 10ec:8139"},
-        {"other card, cut short", "eth2", cutShort(virtio, 100'000), {}, 2, {}, "1af4:1041"},
-        {"images that disagree", "eth0", test::realRom("efi-ne2k_pci"), {}, 2, {}, "0000:0000"},
-        {"cannot be updated", "eth3", test::realRom("pxe-pcnet"), {}, 2, {}, "cannot be updated"},
-        {"other types", "eth4", vmxnet, {}, 4, {PXE, UEFI}, "carries IMG_iSCSI, IMG_UEFI"},
-        {"the types it has", "eth4", vmxnet, {UEFI}, 0, {UEFI}, ""},
-        {"cut at an image's end", "eth0", cutShort(virtio, 75'776), {PXE}, 1, {PXE}, "cut short"},
-        {"empty", "eth0", {}, {}, 1, {}, "the file is empty"},
-        {"no such adapter", "eth9", virtio, {}, 1, {}, "no such adapter"},
-        {"a type it lacks", "eth0", virtio, {iSCSI, PXE}, 5, {iSCSI, PXE}, "no image of type IMG_iSCSI"},
-        {"a number that is no type", "eth0", virtio, {kNoSuch}, 5, {kNoSuch}, "no image of type 77"},
-        {"older", "eth0", older, {}, 3, {PXE, UEFI}, "IMG_PXE would go back from version 1 (installed) to 0"},
-        {"the part that is not older", "eth0", older, {UEFI}, 0, {UEFI}, ""},
-        {"a new type at version 0", "eth0", newAtZero, {}, 4, {iSCSI, PXE}, "carries IMG_PXE, IMG_UEFI"},
-        {"older with other types", "eth0", olderAndMore, {}, 4, {iSCSI, PXE}, "adapter carries"},
-        {"missing type before older", "eth0", older, {iSCSI}, 5, {iSCSI}, "it has IMG_PXE, IMG_UEFI"},
-        {"CLP brings its image's type", "eth0", clp, {CLP}, 4, {CLP, PXE}, "IMG_CLP, IMG_PXE"},
-        {"no code that runs here", "eth0", openFirmware, {CLP}, 5, {CLP}, "no image of type IMG_CLP"},
-        {"VGA", "eth0", pxeFor(0x1041, {}, 0x030000), {}, 2, {}, "not for a network adapter"},
-        {"listed device", "eth0", pxeFor(0x1000, {0x1041}), {}, 0, {PXE}, ""},
-        {"not listed", "eth0", pxeFor(0x1000, {0x1042, 0x1043}), {}, 2, {}, "1af4:1000"},
-    };
+/// As the sample names it.
+Rom fileOf(const std::string& text) {
+    Rom otherProcessor = test::madeRom({{CLP, 1}});
+    otherProcessor[0x1C + ma::rom::kPcirCodeType] = ma::rom::CodeType::OpenFirmware;
+    const std::map<std::string, Rom> described = {
+        {"for another processor", otherProcessor},
+        {"for a graphics card", pxeFor(0x1041, {}, 0x030000)},
+        {"for 1000 and 1041", pxeFor(0x1000, {0x1041})},
+        {"for 1000, 1042 and 1043", pxeFor(0x1000, {0x1042, 0x1043})}};
+    if (described.contains(text)) return described.at(text);
+    const std::size_t comma = text.find(", ");
+    if (!text.starts_with("IMG_")) {
+        Rom rom = test::realRom(text.substr(0, comma));
+        if (comma != std::string::npos) rom.resize(std::stoul(text.substr(text.rfind(' '))));
+        return rom;
+    }
+    std::vector<utils::FirmwareVersionInfo> components;
+    std::istringstream words(text);
+    for (std::string type, version; words >> type >> version;)
+        components.push_back({typesOf(type).at(0), static_cast<std::uint32_t>(std::stoul(version))});
+    return test::madeRom(components);
 }
 
 TEST(ImagePreparationTest, AnswersByTheTable) {
     const test::SimulatedAdapters adapters;
-    for (const Case& one : allCases()) {
-        SCOPED_TRACE(one.what);
+    for (const auto& row : test::readTestTable(QUENX_MIDAPI_TEST_DIR "/samples/preparations")) {
+        SCOPED_TRACE(row[0] + " " + row.at(1));
+        const Rom file = fileOf(row[0].substr(5));
+        const Types requested = row[1] == "all" ? Types() : typesOf(row[1]);
+        const int status = std::stoi(row.at(2));
+        const Types written = row[2].size() > 2 ? typesOf(row[2].substr(2)) : Types();
         test::SyslogCapture::clear();
-        const test::PreparedImage prepared = test::prepareImage(one.adapter, one.file, one.requested);
-        EXPECT_EQ(one.status, prepared.status);
-        EXPECT_EQ(one.written, prepared.types);
-        EXPECT_EQ(one.status != 0, test::SyslogCapture::contains("status " + std::to_string(one.status)));
-        EXPECT_TRUE(one.status == 0 || test::SyslogCapture::contains(one.reason)) << one.reason;
-        if (one.status != 0 && one.status != 3 && one.status != 4) {
-            EXPECT_EQ(one.file.size(), prepared.image.size()) << "the size was changed";
+        const test::PreparedImage prepared = test::prepareImage(row[0].substr(0, 4), file, requested);
+        EXPECT_EQ(status, prepared.status);
+        EXPECT_EQ(written, prepared.types);
+        EXPECT_EQ(status != 0, test::SyslogCapture::contains("status " + std::to_string(status)));
+        EXPECT_TRUE(status == 0 || test::SyslogCapture::contains(row.at(3)));
+        if (status != 0 && status != 3 && status != 4) {
+            EXPECT_EQ(file.size(), prepared.image.size()) << "the size was changed";
             continue;
         }
         // Also when the caller must insist, the output is an image that can be written.
@@ -196,7 +159,7 @@ TEST(ImagePreparationTest, AnswersByTheTable) {
         Types found;
         for (const utils::FirmwareVersionInfo& component : rom.components())
             found.push_back(component.type);
-        EXPECT_EQ(one.written, found);
+        EXPECT_EQ(written, found);
     }
 }
 

@@ -39,4 +39,18 @@ std::vector<std::uint8_t> readTestFile(const std::string& path) {
     return {std::istreambuf_iterator<char>(file), {}};
 }
 
+std::vector<std::vector<std::string>> readTestTable(const std::string& path) {
+    std::ifstream file(path);
+    std::vector<std::vector<std::string>> rows;
+    for (std::string line; std::getline(file, line);) {
+        if (line.empty() || line.starts_with('#')) continue;
+        if (line.starts_with("    "))
+            rows.at(rows.size() - 1).push_back(line.substr(4));
+        else
+            rows.push_back({line});
+    }
+    EXPECT_FALSE(rows.empty()) << path;
+    return rows;
+}
+
 }  // namespace test

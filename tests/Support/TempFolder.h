@@ -32,4 +32,8 @@ class TempFolder {
 /// All bytes of a file; a failed expectation and nothing when it cannot be read.
 std::vector<std::uint8_t> readTestFile(const std::string& path);
 
+/// The rows of a sample: each begins with a line, and has those below it that are indented by four blanks.
+/// Empty lines and comments are left out. A failed expectation when there are none.
+std::vector<std::vector<std::string>> readTestTable(const std::string& path);
+
 }  // namespace test

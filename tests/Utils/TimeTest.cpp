@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Utils/Time.h"
 
-#include <gtest/gtest.h>
+#include <gmock/gmock.h>
 
 #include <array>
 #include <cstdlib>
@@ -26,14 +26,8 @@ Fields decode(const Time& time) {
     return f;
 }
 
-std::string failureOf(const Fields& f) {
-    const test::LogLevelGuard guard(0);
-    try {
-        make(f);
-    } catch (const utils::Exception& failure) {
-        return failure.what();
-    }
-    return "";
+void expectRefusal(const Fields& f, const char* text) {
+    EXPECT_THAT([&] { make(f); }, testing::ThrowsMessage<utils::Exception>(text));
 }
 
 }  // namespace
@@ -56,7 +50,7 @@ TEST(TimeTest, TakesCalendarFieldsAsUtcInEveryZone) {
         }
         // Before 1970 the count wraps, by the same amount everywhere.
         EXPECT_EQ(make({1900, 1, 1, 0, 0, 0}), Time(-2208988800ULL * 1000000));
-        EXPECT_EQ(failureOf({1969, 12, 31, 23, 59, 59}), "wrong time value");
+        expectRefusal({1969, 12, 31, 23, 59, 59}, "wrong time value");
     }
     unsetenv("TZ");
     tzset();
@@ -68,14 +62,14 @@ TEST(TimeTest, ChecksFieldsInOrder) {
         {{2012, 0, 40, 0, 0, 0}, "wrong month value 0"},
         {{2012, 1, 0, 99, 0, 0}, "wrong day value 0"},
         {{2012, 4, 31, 0, 0, 0}, "wrong day value 31"},
-        {{2000, 2, 29, 23, 59, 59}, ""},
         {{1900, 2, 29, 0, 0, 0}, "wrong day value 29"},
         {{2012, 12, 31, -1, 99, 0}, "wrong hour value -1"},
         {{2012, 12, 31, 23, 60, 99}, "wrong minute value 60"},
         {{2012, 12, 31, 23, 59, 60}, "wrong second value 60"},
     };
-    for (const auto& [fields, failure] : table)
-        EXPECT_EQ(failureOf(fields), failure);
+    for (const auto& [fields, text] : table)
+        expectRefusal(fields, text);
+    EXPECT_EQ(decode(make({2000, 2, 29, 23, 59, 59})), (Fields{2000, 2, 29, 23, 59, 59}));
     EXPECT_TRUE(Time::isLeapYear(2000) && Time::isLeapYear(2024));
     EXPECT_FALSE(Time::isLeapYear(1900) || Time::isLeapYear(2023));
 }

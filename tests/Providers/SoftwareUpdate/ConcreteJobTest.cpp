@@ -106,11 +106,8 @@ TEST_F(ConcreteJobTest, ReadsTargetTypesFromTheOptions) {
             {{32768, 5, 32768}, {"IMG_CLP", "x", "IMG_FCoE+IMG_iSCSI"}, {CLP, FCoE, iSCSI}},
             {{32768, 32768}, {"IMG_CLP"}, {CLP}},  // the second has no value
         };
-    for (const auto& [options, values, types] : table) {
-        m_options = options;
-        m_values = values;
-        EXPECT_EQ(Quenx_ConcreteJob::getTargetTypes(m_options, m_values), types);
-    }
+    for (auto [options, values, types] : table)
+        EXPECT_EQ(Quenx_ConcreteJob::getTargetTypes(options, values), types);
     EXPECT_TRUE(test::SyslogCapture::contains("\"Return result[3]=%d\""));
 }
 

@@ -127,17 +127,7 @@ class MethodsTest : public test::UpdateTest {
 };
 
 TEST_F(MethodsTest, AnswerEachCallWithItsValueLineJobAndClaim) {
-    const auto sample = test::readTestFile(QUENX_UPDATE_SAMPLES "/calls");
-    std::vector<Texts> rows;
-    for (const std::string& line : utils::split(std::string(sample.begin(), sample.end()), '\n')) {
-        if (line.empty() || line.starts_with('#')) continue;
-        if (line.starts_with(' '))
-            rows.at(rows.size() - 1).push_back(line.substr(4));
-        else
-            rows.push_back({line});
-    }
-    EXPECT_GT(rows.size(), 50U);
-    for (const Texts& row : rows)
+    for (const Texts& row : test::readTestTable(QUENX_UPDATE_SAMPLES "/calls"))
         expect(row);
     // The controller stood for the first of its ports.
     EXPECT_EQ(test::componentsOf("eth0"), "IMG_PXE 2, IMG_UEFI 1");

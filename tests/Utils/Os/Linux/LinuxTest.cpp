@@ -2,8 +2,8 @@
 #include "Utils/Os/Linux/linux.h"
 
 #include <fcntl.h>
+#include <gmock/gmock.h>
 #include <grp.h>
-#include <gtest/gtest.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
@@ -86,10 +86,7 @@ TEST(LinuxTest, ReadsWholeFilesUpToALimit) {
     ASSERT_EQ(mkfifo((folder / "fifo").c_str(), 0600), 0);
     EXPECT_EQ(sizeRead(folder / "fifo", 10), 0U) << "and does not hang";
     EXPECT_EQ(os::readWholeFile(folder / "missing", 10), std::nullopt);
-    try {
-        os::readWholeFile(folder.path(), 10);
-        FAIL() << "a directory was read";
-    } catch (const std::system_error& error) {
-        EXPECT_EQ(error.what(), "cannot read " + folder.path() + ": Is a directory");
-    }
+    EXPECT_THAT(
+        [&] { os::readWholeFile(folder.path(), 10); },
+        testing::ThrowsMessage<std::system_error>("cannot read " + folder.path() + ": Is a directory"));
 }

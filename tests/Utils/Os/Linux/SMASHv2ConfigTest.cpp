@@ -33,41 +33,19 @@ TEST_F(SMASHv2ConfigTest, WaitsForNoPipeAndSkipsAByteOrderMark) {
 }
 
 TEST_F(SMASHv2ConfigTest, ReadsAndLogsEachLine) {
-    const char* const defaults = "root/cimv2, 300000 ms, 30 s, 0 bytes";
-    const std::tuple<const char*, const char*, Lines> table[] = {
-        {"namespace=root/x", defaults, {}},
-        {"  # Namespace=root/x", defaults, {}},
-        {"Namespace=interop", defaults, {}},
-        {"\tNamespace==root/x=y z", "root/x, 300000 ms, 30 s, 0 bytes", {"Read NameSpace : root/x"}},
-        {"Timeout=0x1F4", "root/cimv2, 500 ms, 30 s, 0 bytes", {"Read LockerTimeout : 500"}},
-        {"Timeout 42 43", "root/cimv2, 42 ms, 30 s, 0 bytes", {"Read LockerTimeout : 42"}},
-        {"Timeout=0xFFFFFFFF", "root/cimv2, 4294967295 ms, 30 s, 0 bytes", {"Read LockerTimeout : -1"}},
-        {"Timeout=", defaults, {"Read LockerTimeout : 300000"}},
-        {"Timeout=-1", defaults, {"Read LockerTimeout : 300000"}},
-        {"Timeout=2147483648", defaults, {"Read LockerTimeout : 300000"}},
-        {"Timeout=0x100000000", defaults, {"Read LockerTimeout : 300000"}},
-        {"OEMCustomizeable=4x", defaults, {"Read OEMCustomizeable : 4"}},
-        {"OEMCustomizeable=65536", defaults, {}},
-        {"ReleaseClaimAfterCheck=1", defaults, {}},
-        {"ReleaseClaimAfterCheck=2", defaults, {}},
-        {"ImageReadTimeout=86400", "root/cimv2, 300000 ms, 86400 s, 0 bytes", {}},
-        {"ImageReadTimeout=0", defaults, {}},
-        {"ImageReadTimeout=86401", defaults, {}},
-        {"LargestImage=1048576", "root/cimv2, 300000 ms, 30 s, 1048576 bytes", {}},
-        {"LargestImage=1M", defaults, {}},
-    };
-    for (const auto& [line, settings, messages] : table) {
-        write(std::string("\n \t\n") + line + "\nUnknown=1\n");
+    for (const Lines& row : test::readTestTable(QUENX_UTILS_SAMPLES "/settings")) {
+        write("\n \t\n" + row[0] + "\nUnknown=1\n");
         SMASHv2Config fresh(folder / "conf");
         SyslogCapture::clear();
         fresh.initialize();
-        SCOPED_TRACE(line);
+        SCOPED_TRACE(row[0]);
+        const Lines messages(row.begin() + 2, row.end());
         EXPECT_EQ(SyslogCapture::messages(), messages);
         EXPECT_EQ(SyslogCapture::count("(initialize@SMASHv2Config.cpp:"), messages.size());
         const auto [silence, largest] = fresh.getImageLimits();
         EXPECT_EQ(fresh.getNamespace() + ", " + std::to_string(fresh.getLockerTimeout()) + " ms, " +
                       std::to_string(silence.count()) + " s, " + std::to_string(largest) + " bytes",
-                  settings);
+                  row[1]);
     }
 }
 
