@@ -2,9 +2,6 @@
 #include "Framework/Classes/InstanceList.h"
 
 #include <gtest/gtest.h>
-#include <unistd.h>
-
-#include <cstdlib>
 
 #include "Framework/Classes/CimBroker.h"
 #include "Framework/Classes/RequestScope.h"
@@ -103,24 +100,6 @@ TEST_F(InstanceListTest, MayBeUsedByAnyThreadAtOnce) {
         test::together({[&] { list.reset(); }, [&] { late->setDeleted(true); }});
     }
     core::drainReaper([] {});
-}
-
-TEST_F(InstanceListTest, DestroysInstancesUntilTheProcessHasEnded) {
-    // As an agent that is still loaded when the process ends. A process of its own: threads survive no fork.
-    GTEST_FLAG_SET(death_test_style, "threadsafe");
-    EXPECT_EXIT(
-        {
-            alarm(60);
-            const core::CimAgent agent("exit");
-            std::atexit([] {
-                destroyOne();
-                destroyOne();
-                if (Gadget::living != 0) _exit(1);
-            });
-            destroyOne();
-            std::exit(0);
-        },
-        testing::ExitedWithCode(0), "");
 }
 
 TEST(CimBrokerTest, LetsAgentsComeAndGoWhileTheyAreUsed) {
