@@ -204,16 +204,6 @@ TEST(DaemonTest, AsksPamAndTheGroupsOfTheSystem) {
     }
 }
 
-TEST(DaemonTest, ServesWithTheProvidersThatCanBeLoaded) {
-    const test::TempFolder folder;
-    folder.write("libQuenx_Broken.so", "no library");
-    for (const auto& library : std::filesystem::directory_iterator(QUENX_LIBRARIES))
-        std::filesystem::create_symlink(library.path(), folder / library.path().filename().string());
-    RunningDaemon daemon({"--providers-directory", folder.path()});
-    EXPECT_EQ(daemon.lines("ein", "Quenx_EthernetPort").size(), 5U);
-    EXPECT_TRUE(contains(daemon.program().seen(), "libQuenx_Broken.so: ")) << daemon.program().seen();
-}
-
 class DaemonSessionTest : public ::testing::TestWithParam<const char*> {
   protected:
     const RunningDaemon m_daemon;
