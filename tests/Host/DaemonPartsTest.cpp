@@ -1,9 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include <gmock/gmock.h>
-#include <gnutls/x509.h>
+#include <sys/stat.h>
 
 #include <cstdlib>
-#include <ctime>
 #include <filesystem>
 #include <fstream>
 
@@ -12,6 +11,8 @@
 #include "Host/Daemon/Daemon.h"
 #include "Host/Daemon/Report.h"
 #include "Host/Daemon/SettingsField.h"
+#include "Host/Server/HttpServer.h"
+#include "Host/Server/LocalSocket.h"
 #include "Host/Server/ServerCertificate.h"
 #include "Host/UnixSocket.h"
 #include "Support/TempFolder.h"
@@ -20,6 +21,7 @@
 namespace {
 
 namespace fs = std::filesystem;
+using host::LocalSocket;
 using host::Settings;
 using ::testing::ElementsAre;
 using ::testing::HasSubstr;
@@ -70,29 +72,6 @@ TEST(CommandLineTest, PutsOptionsBeforeTheFile) {
     EXPECT_THAT(read({"--auth-readers", "b", "c"}).settings.authentication.readers, ElementsAre("b", "c"));
 }
 
-/// A self-signed certificate that is valid for that time.
-void writeCertificate(const std::string& keyFile, const std::string& file, std::time_t from,
-                      std::time_t until) {
-    gnutls_datum_t pem{};
-    gnutls_x509_privkey_t key{};
-    gnutls_x509_crt_t certificate{};
-    ASSERT_EQ(::gnutls_load_file(keyFile.c_str(), &pem), 0);
-    ::gnutls_x509_privkey_init(&key);
-    ASSERT_EQ(::gnutls_x509_privkey_import(key, &pem, GNUTLS_X509_FMT_PEM), 0);
-    ::gnutls_free(pem.data);
-    ::gnutls_x509_crt_init(&certificate);
-    ::gnutls_x509_crt_set_serial(certificate, "1", 1);
-    ::gnutls_x509_crt_set_activation_time(certificate, from);
-    ::gnutls_x509_crt_set_expiration_time(certificate, until);
-    ::gnutls_x509_crt_set_key(certificate, key);
-    ASSERT_EQ(::gnutls_x509_crt_sign2(certificate, certificate, key, GNUTLS_DIG_SHA256, 0), 0);
-    ASSERT_EQ(::gnutls_x509_crt_export2(certificate, GNUTLS_X509_FMT_PEM, &pem), 0);
-    std::ofstream(file).write(reinterpret_cast<const char*>(pem.data), pem.size);
-    ::gnutls_free(pem.data);
-    ::gnutls_x509_crt_deinit(certificate);
-    ::gnutls_x509_privkey_deinit(key);
-}
-
 TEST(ServerCertificateTest, IsRenewedOnlyIfMadeByAnUnsetClock) {
     const test::TempFolder folder;
     const host::TlsSettings files{folder / "new/cert.pem", folder / "new/key.pem", true};
@@ -101,17 +80,20 @@ TEST(ServerCertificateTest, IsRenewedOnlyIfMadeByAnUnsetClock) {
     ASSERT_TRUE(host::makeTlsFiles(files));
     EXPECT_EQ(warning(), "");
     EXPECT_EQ(fs::status(files.key).permissions(), fs::perms(0600));
-    constexpr std::time_t day = 86400;
-    const std::time_t now = std::time(nullptr);
-    writeCertificate(files.key, files.certificate, now - 2 * day, now - day);
-    EXPECT_THAT(warning(), HasSubstr(" has expired on "));
+    const auto put = [&](const std::string& certificate) {
+        const fs::path samples = QUENX_HOST_TEST_DIR "/samples/certificates";
+        const auto replace = fs::copy_options::overwrite_existing;
+        fs::copy(samples / certificate, files.certificate, replace);
+        fs::copy(samples / "key.pem", files.key, replace);
+        fs::permissions(files.key, fs::perms(0600));
+        return warning();
+    };
+    EXPECT_THAT(put("expired.pem"), HasSubstr(" has expired on "));
     EXPECT_FALSE(host::makeTlsFiles(files)) << "the administrator's own";
-    writeCertificate(files.key, files.certificate, now + day, now + 2 * day);
-    EXPECT_THAT(warning(), HasSubstr(" is not valid before "));
+    EXPECT_THAT(put("ahead.pem"), HasSubstr(" is not valid before "));
     EXPECT_FALSE(host::makeTlsFiles(files));
-    for (const std::time_t unset : {std::time_t{100}, std::time_t{946684800}}) {
-        writeCertificate(files.key, files.certificate, unset - day, unset + 3650 * day);
-        EXPECT_NE(warning(), "");
+    for (const char* unset : {"made-in-1970.pem", "made-in-2000.pem"}) {
+        EXPECT_NE(put(unset), "");
         EXPECT_TRUE(host::makeTlsFiles(files)) << unset;
         EXPECT_EQ(warning(), "");
     }
@@ -162,6 +144,55 @@ TEST(PasswdTest, LosesNoChangeThatOthersMake) {
         });
     test::together(removals);
     EXPECT_TRUE(host::readUsersFile(file).empty());
+}
+
+class LocalSocketTest : public ::testing::Test {
+  protected:
+    static void expectRefusal(const std::string& path, const std::string& reason) {
+        EXPECT_THAT([&] { const LocalSocket socket(path); },
+                    ThrowsMessage<host::ListenError>(HasSubstr(reason)));
+    }
+
+    const test::TempFolder m_folder;
+    const std::string m_path = m_folder / "socket";
+};
+
+TEST_F(LocalSocketTest, IsItsOwnersAloneAndGoneAtItsEnd) {
+    {
+        const LocalSocket socket(m_path);
+        const os::Descriptor listener(socket.listener());
+        struct stat status {};
+        ASSERT_EQ(::lstat(m_path.c_str(), &status), 0);
+        EXPECT_EQ(status.st_mode, static_cast<mode_t>(S_IFSOCK | 0600));
+        expectRefusal(m_path, "another process listens there");
+    }
+    EXPECT_FALSE(fs::exists(m_path));
+}
+
+TEST_F(LocalSocketTest, ReplacesWhatAKilledDaemonLeftAndNothingElse) {
+    { const test::UnixSocket killed(SOCK_STREAM, m_path); }
+    {
+        const LocalSocket socket(m_path);
+        const os::Descriptor listener(socket.listener());
+    }
+    const test::UnixSocket foreign(SOCK_STREAM, m_path);
+    ASSERT_EQ(::listen(foreign.number(), 1), 0);
+    expectRefusal(m_path, "another process listens there");
+    fs::rename(m_path, m_folder / "other");
+    fs::create_symlink(m_folder / "other", m_path);
+    expectRefusal(m_path, "there is a file that is no socket");
+    EXPECT_TRUE(fs::is_symlink(m_path));
+    fs::remove(m_path);
+    m_folder.write("socket", "somebody's file");
+    expectRefusal(m_path, "there is a file that is no socket");
+    EXPECT_TRUE(fs::is_regular_file(m_path));
+}
+
+TEST_F(LocalSocketTest, StandsWhereNobodyElseCanPutOne) {
+    expectRefusal(m_folder / "none/socket", "No such file or directory");
+    expectRefusal(m_folder / std::string(120, 'x'), "a socket's path has at most 107 characters");
+    ::chmod(m_folder.path().c_str(), 01777);
+    expectRefusal(m_path, "others can write to " + m_folder.path());
 }
 
 }  // namespace
