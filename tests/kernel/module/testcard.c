@@ -22,7 +22,6 @@ static const char *const names[VERSIONS] = { "fw", "fw.undi" };
 enum { WITHOUT_FLASH = 1 };
 
 struct card {
-	struct list_head list;
 	char name[16];
 	struct mutex lock; /* of the versions and the content */
 	char running[VERSIONS][VERSION_SIZE];
@@ -30,65 +29,44 @@ struct card {
 	struct debugfs_blob_wrapper content;
 	atomic_t flashing;
 	struct dentry *folder;
-	u32 fail_at, fail_errno, most_flashing, flashes;
-	bool hold, quiet, fail_activation, lose_interface;
+	u32 fail_at, most_flashing, flashes;
+	bool hold, fail_activation, lose_interface;
 };
 
 struct function {
 	struct pci_dev *pci;
 	struct card *card;
-	struct devlink_port port;
 	struct net_device *netdev;
 };
 
-/* Cards outlive their functions: a flash keeps its content while no driver is bound. */
-static LIST_HEAD(cards);
-static DEFINE_MUTEX(cards_lock);
+/* By slot, of the one bus. Cards outlive their functions: a flash keeps its content while no driver is bound. */
+static struct card cards[32];
 static struct dentry *folder;
 
-static struct card *make_card(const char *name)
+static struct card *card_of(struct pci_dev *pci)
 {
-	struct card *card = kzalloc(sizeof(*card), GFP_KERNEL);
+	struct card *card = &cards[PCI_SLOT(pci->devfn)];
 	int i;
 
-	if (!card)
-		return NULL;
-	strscpy(card->name, name, sizeof(card->name));
+	if (card->folder)
+		return card;
+	snprintf(card->name, sizeof(card->name), "%04x:%02x:%02x", pci_domain_nr(pci->bus), pci->bus->number,
+		 PCI_SLOT(pci->devfn));
 	mutex_init(&card->lock);
 	for (i = 0; i < VERSIONS; i++) {
 		strscpy(card->running[i], "1.0.0", VERSION_SIZE);
 		strscpy(card->stored[i], "1.0.0", VERSION_SIZE);
 	}
 	card->fail_at = U32_MAX;
-	card->fail_errno = EIO;
-	card->folder = debugfs_create_dir(name, folder);
+	card->folder = debugfs_create_dir(card->name, folder);
 	debugfs_create_bool("hold", 0600, card->folder, &card->hold);
 	debugfs_create_u32("fail_at", 0600, card->folder, &card->fail_at);
-	debugfs_create_u32("fail_errno", 0600, card->folder, &card->fail_errno);
-	debugfs_create_bool("quiet", 0600, card->folder, &card->quiet);
 	debugfs_create_bool("fail_activation", 0600, card->folder, &card->fail_activation);
 	debugfs_create_bool("lose_interface", 0600, card->folder, &card->lose_interface);
 	debugfs_create_u32("flashes", 0400, card->folder, &card->flashes);
 	debugfs_create_atomic_t("flashing", 0400, card->folder, &card->flashing);
 	debugfs_create_u32("most_flashing", 0600, card->folder, &card->most_flashing);
 	debugfs_create_blob("content", 0400, card->folder, &card->content);
-	list_add(&card->list, &cards);
-	return card;
-}
-
-static struct card *card_of(struct pci_dev *pci)
-{
-	struct card *card;
-	char name[16];
-
-	snprintf(name, sizeof(name), "%04x:%02x:%02x", pci_domain_nr(pci->bus), pci->bus->number, PCI_SLOT(pci->devfn));
-	mutex_lock(&cards_lock);
-	list_for_each_entry(card, &cards, list)
-		if (!strcmp(card->name, name))
-			goto out;
-	card = make_card(name);
-out:
-	mutex_unlock(&cards_lock);
 	return card;
 }
 
@@ -114,18 +92,15 @@ static int write_flash(struct devlink *devlink, struct card *card, struct devlin
 {
 	u32 step;
 
-	if (!card->quiet) {
-		devlink_flash_update_status_notify(devlink, "Preparing to flash", params->component, 0, 0);
-		devlink_flash_update_timeout_notify(devlink, "Erasing", params->component, 30);
-	}
+	devlink_flash_update_status_notify(devlink, "Preparing to flash", params->component, 0, 0);
+	devlink_flash_update_timeout_notify(devlink, "Erasing", params->component, 30);
 	for (step = 0; step <= STEPS; step++) {
 		if (step == card->fail_at) {
 			NL_SET_ERR_MSG(extack, "the flash of the test card does not answer");
-			return -(int)card->fail_errno;
+			return -EIO;
 		}
-		if (!card->quiet)
-			devlink_flash_update_status_notify(devlink, "Flashing", params->component,
-							   params->fw->size * step / STEPS, params->fw->size);
+		devlink_flash_update_status_notify(devlink, "Flashing", params->component,
+						   params->fw->size * step / STEPS, params->fw->size);
 		do
 			msleep(1);
 		while (READ_ONCE(card->hold) && step == STEPS / 2);
@@ -206,46 +181,25 @@ static netdev_tx_t drop_packet(struct sk_buff *packet, struct net_device *netdev
 	return NETDEV_TX_OK;
 }
 
-static struct devlink_port *port_of(struct net_device *netdev)
-{
-	return &(*(struct function **)netdev_priv(netdev))->port;
-}
-
-static const struct net_device_ops netdev_ops = {
-	.ndo_start_xmit = drop_packet,
-	.ndo_get_devlink_port = port_of,
-};
+static const struct net_device_ops netdev_ops = { .ndo_start_xmit = drop_packet };
 
 static int add_interface(struct devlink *devlink, struct function *function)
 {
-	struct devlink_port_attrs attributes = { .flavour = DEVLINK_PORT_FLAVOUR_PHYSICAL };
 	u8 address[ETH_ALEN] = { 2, 0, 0, 0, function->pci->bus->number, function->pci->devfn };
-	struct net_device *netdev = alloc_etherdev(sizeof(function));
+	struct net_device *netdev = alloc_etherdev(0);
 	int error;
 
 	if (!netdev)
 		return -ENOMEM;
-	*(struct function **)netdev_priv(netdev) = function;
-	attributes.phys.port_number = PCI_FUNC(function->pci->devfn);
-	memset(&function->port, 0, sizeof(function->port));
-	devlink_port_attrs_set(&function->port, &attributes);
-	error = devl_port_register(devlink, &function->port, 0);
-	if (error)
-		goto free;
 	netdev->netdev_ops = &netdev_ops;
 	dev_net_set(netdev, devlink_net(devlink));
 	SET_NETDEV_DEV(netdev, &function->pci->dev);
 	eth_hw_addr_set(netdev, address);
 	error = register_netdev(netdev);
 	if (error)
-		goto unregister;
-	devlink_port_type_eth_set(&function->port, netdev);
-	function->netdev = netdev;
-	return 0;
-unregister:
-	devl_port_unregister(&function->port);
-free:
-	free_netdev(netdev);
+		free_netdev(netdev);
+	else
+		function->netdev = netdev;
 	return error;
 }
 
@@ -253,9 +207,7 @@ static void remove_interface(struct function *function)
 {
 	if (!function->netdev)
 		return;
-	devlink_port_type_clear(&function->port);
 	unregister_netdev(function->netdev);
-	devl_port_unregister(&function->port);
 	free_netdev(function->netdev);
 	function->netdev = NULL;
 }
@@ -301,8 +253,6 @@ static int probe(struct pci_dev *pci, const struct pci_device_id *id)
 	struct devlink *devlink;
 	int error;
 
-	if (!card)
-		return -ENOMEM;
 	devlink = devlink_alloc(id->driver_data == WITHOUT_FLASH ? &operations_without_flash : &operations,
 				sizeof(*function), &pci->dev);
 	if (!devlink)
@@ -335,37 +285,20 @@ static void remove(struct pci_dev *pci)
 
 static const struct pci_device_id ids[] = {
 	{ PCI_DEVICE(0x8086, 0x100e) }, /* qemu's e1000 */
-	{ PCI_DEVICE(0x8086, 0x1008), .driver_data = WITHOUT_FLASH }, /* and its e1000-82544gc */
+	{ PCI_DEVICE(0x8086, 0x100c), .driver_data = WITHOUT_FLASH }, /* and its e1000-82544gc */
 	{}
 };
 MODULE_DEVICE_TABLE(pci, ids);
 
 static struct pci_driver driver = { .name = KBUILD_MODNAME, .id_table = ids, .probe = probe, .remove = remove };
 
+/* There is no way out: the machine goes when the tests are done. */
 static int __init testcard_init(void)
 {
-	int error;
-
 	folder = debugfs_create_dir(KBUILD_MODNAME, NULL);
-	error = pci_register_driver(&driver);
-	if (error)
-		debugfs_remove(folder);
-	return error;
-}
-
-static void __exit testcard_exit(void)
-{
-	struct card *card, *next;
-
-	pci_unregister_driver(&driver);
-	debugfs_remove(folder);
-	list_for_each_entry_safe(card, next, &cards, list) {
-		kvfree(card->content.data);
-		kfree(card);
-	}
+	return pci_register_driver(&driver);
 }
 
 module_init(testcard_init);
-module_exit(testcard_exit);
 MODULE_LICENSE("GPL");
 MODULE_DESCRIPTION("Ethernet cards with a flash in memory, for tests");
