@@ -2,23 +2,16 @@
 #include "MidAPI/Backends.h"
 
 #include <gtest/gtest.h>
-#include <sched.h>
-#include <sys/mount.h>
 #include <unistd.h>
 
 #include <cstdlib>
-#include <filesystem>
-#include <fstream>
 #include <map>
 
 #include "MidAPI/ma.h"
-#include "Support/Program.h"
 #include "Support/SimulatedAdapters.h"
 #include "Support/TestRoms.h"
 
 namespace {
-
-constexpr const char* kPciDevices = "/sys/bus/pci/devices";
 
 class BackendsTest : public testing::Test {
   protected:
@@ -54,18 +47,6 @@ bool installsOnEth0() {
     const test::PreparedImage prepared =
         test::prepareImage("eth0", test::madeRom({{utils::FirmwareType::PXE, 9}}));
     return test::writeImage("eth0", prepared.image).done;
-}
-
-/// Puts folders of the test's own in the place of the system's, for this process alone.
-void standInForTheSystem(const test::TempFolder& root) {
-    const bool isAlone =
-        ::unshare(CLONE_NEWNS) == 0 && ::mount(nullptr, "/", nullptr, MS_REC | MS_PRIVATE, nullptr) == 0;
-    if (!isAlone) ::_exit(2);
-    for (const char* folder : {"/etc", "/var/lib", kPciDevices}) {
-        const std::string own = root.path() + folder;
-        std::filesystem::create_directories(own);
-        if (::mount(own.c_str(), folder, nullptr, MS_BIND, nullptr) != 0) ::_exit(2);
-    }
 }
 
 /// What is in use after the choice: what it says of its search, or the error.
@@ -128,31 +109,6 @@ TEST_F(BackendsTest, StayUntilTheNextOneIsThere) {
     EXPECT_TRUE(installsOnEth0());
     EXPECT_EQ("IMG_PXE 9, IMG_UEFI 0", test::describeRom(adapters->flashContent("eth0")))
         << "the state is that of the variable";
-}
-
-TEST_F(BackendsTest, AreThoseOfTheSystemWhereNothingIsSaid) {
-    const bool canMount =
-        test::run({"/usr/bin/unshare", "-m", "/bin/mount", "--bind", kPciDevices, kPciDevices}).status == 0;
-    if (!canMount) GTEST_SKIP() << "nothing can be mounted";
-    const test::TempFolder root;
-    const auto answers = [&root] {
-        standInForTheSystem(root);
-        choose({});
-        const bool isEmpty = ma::enumerateAdapters().empty();
-        std::ofstream("/etc/quenx-adapters.toml") << test::kTestAdapters;
-        ma::setBackend(nullptr);
-        const bool isSimulated =
-            installsOnEth0() && std::filesystem::exists("/var/lib/quenx/adapters/eth0/state");
-        // A forgotten description hides no card; one that is named is what is wanted.
-        const std::string function = kPciDevices + std::string("/0000:05:00.0");
-        std::filesystem::create_directory(function);
-        std::ofstream(function + "/class") << "0x020000\n";
-        ma::setBackend(nullptr);
-        const bool isReal = ma::enumerateAdapters() == utils::StringArray{"0000:05:00.0"};
-        choose({{"QUENX_ADAPTERS", "/etc/quenx-adapters.toml"}});
-        return isEmpty && isSimulated && isReal && ma::enumerateAdapters().size() == 5;
-    };
-    EXPECT_EXIT(::_exit(answers() ? 0 : 1), testing::ExitedWithCode(0), "");
 }
 
 TEST_F(BackendsTest, AnswersUntilTheProcessHasEnded) {
