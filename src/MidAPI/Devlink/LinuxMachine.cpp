@@ -50,15 +50,10 @@ std::optional<std::size_t> receiveNow(int socket, std::span<std::uint8_t> buffer
 
 Machine::~Machine() = default;
 
-std::optional<std::string> LinuxMachine::readFile(const std::string& path) try {
-    constexpr std::size_t kMost = std::size_t{1} << 20;
-    const auto bytes = os::readWholeFile(path, kMost);
-    if (!bytes) return std::nullopt;
-    std::string text(bytes->begin(), bytes->end());
-    if (text.ends_with('\n')) text.pop_back();
+std::optional<std::string> LinuxMachine::readFile(const std::string& path) {
+    auto text = os::readSystemText(path);
+    if (text && text->ends_with('\n')) text->pop_back();
     return text;
-} catch (const std::system_error&) {
-    return std::nullopt;
 }
 
 std::optional<std::string> LinuxMachine::readLink(const std::string& path) {

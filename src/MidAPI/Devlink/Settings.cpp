@@ -42,11 +42,11 @@ ComponentTable::PackageRow readPackageComponent(const TomlTable& table) {
 
 /// Nothing where nobody named a file and the usual one is not there.
 std::optional<std::string> readSettings(const char* named, const std::string& path) try {
-    constexpr std::size_t kMost = std::size_t{1} << 20;
-    const auto bytes = os::readWholeFile(path, kMost);
-    if (bytes) return std::string(bytes->begin(), bytes->end());
-    if (named == nullptr) return std::nullopt;
+    auto text = os::readTextFile(path);
+    if (text || named == nullptr) return text;
     throw AdapterError(std::string(kVariable) + ": there is no file " + path + "; name a readable file");
+} catch (const os::UnusableFile& error) {
+    throw AdapterError("the settings of devlink: " + path + " " + error.what());
 } catch (const std::system_error& error) {
     throw AdapterError(std::string("the settings of devlink: ") + error.what());
 }

@@ -38,22 +38,13 @@ int lockWithin(int file, std::chrono::milliseconds patience) {
     return 0;
 }
 
-/// The first `most` bytes of a file of the system's, as text; empty when it cannot be read.
-std::string readText(const std::string& path, std::size_t most) {
-    try {
-        const auto bytes = readWholeFile(path, most);
-        return bytes ? std::string(bytes->begin(), bytes->end()) : "";
-    } catch (const std::system_error&) {
-        return "";
-    }
-}
-
 /// What the program of a process is called: " (quenxctl)".
 std::string programOf(pid_t process) {
     constexpr std::size_t kMaxName = 15;
     std::string name;
     // Anybody can give a program any name, and this one goes to logs and terminals.
-    for (const char character : readText("/proc/" + std::to_string(process) + "/comm", kMaxName))
+    const std::string file = "/proc/" + std::to_string(process) + "/comm";
+    for (const char character : readSystemText(file, kMaxName).value_or(""))
         if (character > ' ' && character <= '~') name += character;
     return name.empty() ? "" : " (" + name + ")";
 }
@@ -88,13 +79,12 @@ std::string FileLock::holder() const {
 }
 
 pid_t FileLock::holdingProcess() const {
-    constexpr std::size_t kMaxLocks = std::size_t{1} << 20;
     struct stat status {};
     if (::fstat(m_file.number(), &status) != 0) return 0;
     // The kernel is asked, not the file: in that a holder of another kind leaves no number. Some file systems
     // have a device number of their own in the kernel's list: the inode then has to do.
     pid_t sameInode = 0;
-    std::istringstream locks(readText("/proc/locks", kMaxLocks));
+    std::istringstream locks(readSystemText("/proc/locks").value_or(""));
     for (std::string line; std::getline(locks, line);) {
         int process = 0;
         unsigned int major = 0;

@@ -147,6 +147,13 @@ std::optional<std::string> readTextFile(const std::string& path) {
     return std::string(bytes->begin(), bytes->end());
 }
 
+std::optional<std::string> readSystemText(const std::string& path, std::size_t most) try {
+    const auto bytes = readWholeFile(path, most);
+    return bytes ? std::optional(std::string(bytes->begin(), bytes->end())) : std::nullopt;
+} catch (const std::system_error&) {
+    return std::nullopt;
+}
+
 void ignoreOtherSignals() noexcept {
     for (const int each : {SIGPIPE, SIGXFSZ, SIGUSR1, SIGUSR2, SIGALRM, SIGVTALRM, SIGPROF, SIGIO, SIGPWR})
         static_cast<void>(signal(each, SIG_IGN));

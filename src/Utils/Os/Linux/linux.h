@@ -71,6 +71,11 @@ class QUENX_EXPORT UnusableFile : public std::runtime_error {
     using std::runtime_error::runtime_error;
 };
 
+/// The first `most` bytes of a file of the system's own, of procfs or sysfs; nothing when it cannot be read,
+/// whatever the reason.
+QUENX_EXPORT std::optional<std::string> readSystemText(const std::string& path,
+                                                       std::size_t most = std::size_t{1} << 20);
+
 /// Has this process ignore the signals that mean nothing to it and would end it, in a flash too: a client or
 /// a reader that goes away, a file that may not grow, timers and user signals. To be called before anything
 /// that such an end would harm.
