@@ -75,7 +75,8 @@ std::vector<std::uint8_t> FlashStore::content() const {
         // Another process may have made two updates since the record was read.
         if (this->state().generation != state->generation) continue;
         if (auto bytes = m_folder.bankContent(*state, state->inactiveBank())) {
-            QUENX_ERROR("%s is damaged, booting the other bank", m_folder.bank(state->activeBank).c_str());
+            logOnce({.state = {},
+                     .damage = m_folder.bank(state->activeBank) + " is damaged, booting the other bank"});
             return *bytes;
         }
         break;

@@ -42,8 +42,9 @@ struct FileLook {
 
 /// Opens what the path names, once, and reads a regular file of at most `most` bytes whole. Only regular
 /// files and directories are opened: a FIFO never blocks, and a device is not touched. A medium that gives a
-/// page a second uses up no patience. Nothing when the file was given up; further calls for this path answer
-/// so at once until the one that hangs has come back. errno tells why a file cannot be opened.
+/// page a second uses up patience for the first 64 KiB alone: then pages are asked for. Nothing when the file
+/// was given up; further calls for this path answer so at once until the one that hangs has come back. errno
+/// tells why a file cannot be opened.
 /// @param most  a larger file is not read; -1 reads none
 /// @throws std::bad_alloc  before the file is touched
 QUENX_EXPORT std::optional<FileLook> lookAtFile(const std::string& path, std::int64_t most,
