@@ -58,9 +58,6 @@ DeviceInfo readDeviceInfo(ByteView attributes) {
     DeviceInfo info;
     for (const Attribute& attribute : readAttributes(attributes)) {
         switch (attribute.type) {
-            case DEVLINK_ATTR_INFO_DRIVER_NAME:
-                info.driver = attribute.text();
-                break;
             case DEVLINK_ATTR_INFO_SERIAL_NUMBER:
                 info.serialNumber = attribute.text();
                 break;
@@ -95,7 +92,6 @@ Notification readNotification(const Message& message) {
         const std::uint64_t number = attribute.number<std::uint64_t>().value_or(0);
         if (attribute.type == DEVLINK_ATTR_FLASH_UPDATE_STATUS_DONE) status.done = number;
         if (attribute.type == DEVLINK_ATTR_FLASH_UPDATE_STATUS_TOTAL) status.total = number;
-        if (attribute.type == DEVLINK_ATTR_FLASH_UPDATE_STATUS_TIMEOUT) status.timeout = number;
     }
     if (bus == kPciBus) notification.device = std::move(device);
     return notification;

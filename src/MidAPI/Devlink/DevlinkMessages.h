@@ -26,7 +26,6 @@ QUENX_EXPORT Family readFamily(ByteView attributes);
 
 /// What a driver tells of its device.
 struct DeviceInfo {
-    std::string driver;
     std::string serialNumber;
     std::string boardSerialNumber;
     std::vector<NamedVersion> versions;  ///< each name once, in the driver's order
@@ -37,10 +36,9 @@ QUENX_EXPORT DeviceInfo readDeviceInfo(ByteView attributes);
 
 /// How far a flash is.
 struct FlashStatus {
-    std::string text;           ///< the driver's words: for people, never to decide by
-    std::uint64_t done = 0;     ///< bytes of the current step
-    std::uint64_t total = 0;    ///< 0: the message is only a text
-    std::uint64_t timeout = 0;  ///< seconds that one long step may take; 0: no such step
+    std::string text;         ///< the driver's words: for people, never to decide by
+    std::uint64_t done = 0;   ///< bytes of the current step
+    std::uint64_t total = 0;  ///< 0: the message is only a text, or about one long step
 };
 
 /// What the kernel tells everybody.

@@ -5,7 +5,6 @@
 #include <cerrno>
 #include <system_error>
 
-#include "MidAPI/Devlink/FlashProgress.h"
 #include "MidAPI/Devlink/FlashWatch.h"
 #include "MidAPI/Devlink/StagedImage.h"
 #include "MidAPI/OperationFailure.h"

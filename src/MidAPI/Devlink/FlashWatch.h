@@ -3,6 +3,8 @@
 
 #include <atomic>
 #include <chrono>
+#include <cstddef>
+#include <cstdint>
 #include <functional>
 #include <optional>
 #include <string>
@@ -10,9 +12,29 @@
 
 #include "MidAPI/Devlink/DevlinkConnection.h"
 #include "MidAPI/Devlink/Machine.h"
+#include "MidAPI/Progress.h"
 #include "Utils/Export.h"
 
 namespace ma::devlink {
+
+/// Makes one percentage of what a driver tells during the flashes of an update. Drivers count each of their
+/// steps from 0; the percentage never goes back, and is below 100 until the update is done. One thread at a
+/// time.
+class QUENX_EXPORT FlashProgress {
+  public:
+    /// @param parts  how many flashes the update has, each an equal part of the whole
+    FlashProgress(Progress& progress, std::size_t parts) : m_progress(progress), m_parts(parts) {}
+
+    void report(const FlashStatus& status);
+    void partDone();
+
+  private:
+    void advance(std::uint64_t percentOfPart);
+
+    Progress& m_progress;
+    const std::size_t m_parts;
+    std::size_t m_done = 0;
+};
 
 /// Follows one flash by what the kernel tells everybody, on a thread of its own, since the request for the
 /// flash blocks until it is over. What it reads is for people alone: how a flash ended is told by the answer

@@ -4,7 +4,6 @@
 #include <algorithm>
 
 #include "MidAPI/Devlink/PldmPackage.h"
-#include "MidAPI/Devlink/VersionText.h"
 #include "MidAPI/Image/ImagePreparation.h"
 #include "MidAPI/Image/OptionRom.h"
 #include "Utils/Utils.h"

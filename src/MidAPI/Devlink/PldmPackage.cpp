@@ -139,13 +139,10 @@ PldmDevice readDevice(Fields& header, std::size_t bitmapLength) {
 }
 
 PldmComponent readComponent(Fields& header, unsigned revision) {
-    constexpr std::uint16_t kHasStamp = 2;
     PldmComponent component;
-    component.classification = header.number16();
+    header.take(2);  // its classification
     component.identifier = header.number16();
-    const std::uint32_t stamp = header.number32();
-    if ((header.number16() & kHasStamp) != 0) component.comparisonStamp = stamp;
-    header.take(2);  // how it is activated
+    header.take(4 + 2 + 2);  // a number to compare by, options, how it is activated
     component.offset = header.number32();
     component.size = header.number32();
     const std::uint8_t textType = header.byte();
@@ -204,10 +201,8 @@ void readPackage(Bytes file, PldmPackage& package) {
     header.take(kDateLength);
     const std::uint16_t bitmapBits = header.number16();
     if (bitmapBits % 8 != 0) header.fail("has a component bitmap of " + std::to_string(bitmapBits) + " bits");
-    const std::uint8_t textType = header.byte();
-    const std::uint8_t textLength = header.byte();
-    package.version = printableText(header.take(textLength), textType);
-
+    header.byte();               // the type of the package's own version
+    header.take(header.byte());  // that version
     header.enter("the device records");
     for (unsigned count = header.byte(); count > 0; --count)
         package.devices.push_back(readDevice(header, bitmapBits / 8U));

@@ -32,10 +32,7 @@ struct QUENX_EXPORT PldmDevice {
 
 /// One image of the package (DSP0267 7.6). The maker alone knows what its identifier means.
 struct PldmComponent {
-    std::uint16_t classification = 0;
     std::uint16_t identifier = 0;
-    /// A number to compare by in place of the version; nothing where the package has none.
-    std::optional<std::uint32_t> comparisonStamp;
     std::uint32_t offset = 0;  ///< from the start of the file, bytes
     std::uint32_t size = 0;    ///< bytes
     std::string version;
@@ -43,7 +40,6 @@ struct PldmComponent {
 
 /// What reading a file gave. With an error nothing of it is to be trusted.
 struct PldmPackage {
-    std::string version;
     std::vector<PldmDevice> devices;
     std::vector<PldmComponent> components;
     std::optional<std::string> error;  ///< a text naming what is wrong, and at which offset of the file
