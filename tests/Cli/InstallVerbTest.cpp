@@ -3,8 +3,10 @@
 #include <gtest/gtest.h>
 
 #include <deque>
+#include <map>
 #include <sstream>
 
+#include "Cli/Update/Card.h"
 #include "Cli/Verbs/Verbs.h"
 #include "Framework/Requests/CimRequests.h"
 #include "MidAPI/Simulator/Simulator.h"
@@ -316,6 +318,19 @@ TEST_F(CardVerbTest, TellsOfTheCardBeforeAndOfTheResetAfterAnUpdate) {
     m_service->updateState = "Busy";
     run(cli::showAdapters);
     EXPECT_NE(m_out.str().find("1af4:1041  busy       IMG_PXE 1"), std::string::npos) << m_out.str();
+}
+
+TEST(CallerTest, IsWhoLoggedInToAnAncestor) {
+    std::map<std::string, std::string> files = {{"/proc/self/environ", "A=1"},
+                                                {"/proc/self/status", "Name:\tx\nPPid:\t7\nUid:\t0"},
+                                                {"/proc/7/status", "PPid:\t1"},
+                                                {"/proc/1/status", "PPid:\t0"}};
+    const auto caller = [&] { return cli::findCaller([&](const std::string& path) { return files[path]; }); };
+    EXPECT_EQ("", caller());
+    files["/proc/7/environ"] = std::string("A=1\0SSH_CONNECTION=192.0.2.7 5000 192.0.2.1 22\0B=", 50);
+    EXPECT_EQ("192.0.2.7", caller());
+    files = {{"/proc/self/status", "PPid:\tself"}};  // a ring, as no system has it
+    EXPECT_EQ("", caller());
 }
 
 TEST_F(CardVerbTest, RefusesAnImageInTheWordsOfItsBackend) {

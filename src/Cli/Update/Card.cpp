@@ -4,18 +4,23 @@
 #include "Cli/Display/Output.h"
 #include "Cli/Display/Terminal.h"
 #include "Cli/Update/Service.h"
-#include "MidAPI/Devlink/Caller.h"
-#include "MidAPI/Devlink/Machine.h"
 #include "MidAPI/ma.h"
+#include "Utils/Os/Linux/linux.h"
 #include "Utils/Utils.h"
 
 namespace cli {
 
 namespace {
 
+/// The rest of the line, or the variable, that begins with this; empty where there is none.
+std::string valueOf(const std::string& text, char separator, std::string_view beginning) {
+    for (const std::string& line : utils::split(text, separator))
+        if (line.starts_with(beginning)) return utils::trim(line.substr(beginning.size()));
+    return {};
+}
+
 std::string caller() {
-    ma::devlink::LinuxMachine machine;
-    return ma::devlink::findCaller(machine);
+    return findCaller([](const std::string& path) { return os::readSystemText(path).value_or(""); });
 }
 
 std::string outcomeText(const ma::Activation& activation) {
@@ -30,6 +35,21 @@ std::string outcomeText(const ma::Activation& activation) {
 }
 
 }  // namespace
+
+std::string findCaller(const std::function<std::string(const std::string& path)>& read) {
+    // The client's address and port, then the server's. "sudo" takes it out of the environment of what it
+    // starts, and has it itself.
+    constexpr std::string_view kVariable = "SSH_CONNECTION=";
+    constexpr int kMostAncestors = 64;
+    std::string process = "self";
+    for (int step = 0; step < kMostAncestors && !process.empty() && process != "0"; ++step) {
+        const std::string folder = "/proc/" + process;
+        const std::string ends = valueOf(read(folder + "/environ"), '\0', kVariable);
+        if (!ends.empty()) return ends.substr(0, ends.find(' '));
+        process = valueOf(read(folder + "/status"), '\n', "PPid:");
+    }
+    return {};
+}
 
 ma::CardUse readCard(const Connection& connection, const std::string& adapter) {
     return connection.isInProcess ? ma::getCardUse(adapter, caller()) : ma::CardUse();

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include <functional>
 #include <nlohmann/json_fwd.hpp>
 #include <ostream>
 #include <string>
@@ -10,6 +11,12 @@
 
 /// The card behind an adapter port: what stands and falls with it, and what it waits for after an update.
 namespace cli {
+
+/// The network address from which the user of this process has logged in, as the environment of the process
+/// or of one that it descends from tells it; empty for a user at the machine. What is not to be read counts
+/// as nothing, so this finds who is there, and keeps out nobody.
+/// @param read  the content of a file of /proc; empty where it cannot be read
+std::string findCaller(const std::function<std::string(const std::string& path)>& read);
 
 /// What runs over the card of an adapter, as far as the machine tells it. Nothing on a server.
 ma::CardUse readCard(const Connection& connection, const std::string& adapter);

@@ -5,7 +5,6 @@
 
 #include <algorithm>
 
-#include "MidAPI/Devlink/Caller.h"
 #include "MidAPI/Devlink/FakeKernel.h"
 #include "MidAPI/Devlink/NetworkUse.h"
 #include "Utils/Utils.h"
@@ -122,20 +121,6 @@ TEST_F(NetworkUseTest, TellsWhichLinksHaveNotComeBack) {
     put("4", "eth4", false);
     EXPECT_THAT(ma::devlink::missingLinks(m_machine, before),
                 ElementsAre("eth1 is down", "0000:03:00.0 has no network interface (before: eth3)"));
-}
-
-TEST(CallerTest, IsWhoLoggedInToAnAncestor) {
-    test::FakeKernel machine;
-    machine.put("/proc/self/environ", "A=1");
-    machine.put("/proc/self/status", "Name:\tx\nPPid:\t7\nUid:\t0");
-    machine.put("/proc/7/status", "PPid:\t1");
-    machine.put("/proc/1/status", "PPid:\t0");
-    EXPECT_EQ("", ma::devlink::findCaller(machine));
-    machine.put("/proc/7/environ", std::string("A=1\0SSH_CONNECTION=192.0.2.7 5000 192.0.2.1 22\0B=", 50));
-    EXPECT_EQ("192.0.2.7", ma::devlink::findCaller(machine));
-    machine.drop("/proc/7/environ");
-    machine.put("/proc/self/status", "PPid:\tself");  // a ring, as no system has it
-    EXPECT_EQ("", ma::devlink::findCaller(machine));
 }
 
 }  // namespace
