@@ -26,14 +26,17 @@ struct ActivationRequest {
 /// How an activation ended.
 struct Activation {
     enum Status {
-        Done,          ///< the new firmware runs, and the interfaces are back
+        Done,          ///< the new firmware runs, as far as the driver tells it, and the interfaces are back
         NotOffered,    ///< this adapter takes a restart of the machine, or a power cycle
         WouldDisrupt,  ///< refused: the card's use has losses
-        Failed,        ///< the driver refused or failed; the text says why
+        Failed,        ///< the driver refused or failed, and what ran before runs still
         NotBack,       ///< it was done, but an interface or a link of the card has not come back in time
+        StillPending,  ///< it was done, but the driver tells that what ran before runs still
+        Unknown,       ///< nobody has told whether it was done, and what runs now cannot be read
     };
     Status status = NotOffered;
-    std::string text;  ///< for people: a clause, or several with semicolons; empty when it is Done
+    std::string text;  ///< for people: a clause, or several with semicolons; Done has one where the driver
+                       ///< does not tell which firmware runs
 };
 
 }  // namespace ma

@@ -25,12 +25,13 @@ enum class BootType : std::uint32_t {
 /// What prepareFlashImage() answers. Callers take every value above 6 like 0.
 enum PrepareStatus : int {
     Prepared = 0,           ///< the output buffer holds the image to write
-    InvalidParameter = 1,   ///< no such adapter, an empty file, or a file that is not an intact ROM image
+    InvalidParameter = 1,   ///< no such adapter, a file that is empty or too large, or no intact image
     ImageNotSupported = 2,  ///< made for another card, or the adapter cannot be updated at all
-    ImageIsOlder = 3,       ///< older than what is installed, same types; the output is filled all the same
+    ImageIsOlder = 3,       ///< older than what is installed; the output is filled all the same
     ImageTypesDiffer = 4,   ///< other image types than the adapter carries; the output is filled all the same
-    ImageNotApplicable = 5,  ///< a requested type is not in the file, or nothing in it can be installed
-    UnspecifiedError = 6,    ///< the adapter itself could not be read
+    ImageNotApplicable = 5,  ///< a requested type is not in the file, or is no component that the driver
+                             ///< takes; or nothing in it can be installed
+    UnspecifiedError = 6,  ///< the adapter could not be read, is being written to, or may not be written to
 };
 
 /// What can be said of an image file before it is written.
@@ -42,8 +43,8 @@ struct ImageVerdict {
     std::vector<std::string> unchecked = {};
 };
 
-/// Error codes that writeFlashImage() and updateCapabilityWord() leave behind; a backend or a simulated fault
-/// may leave others.
+/// Error codes that writeFlashImage() and updateCapabilityWord() leave behind. A simulated fault may leave
+/// any; other failures of the system or a driver leave their errno value, where that is above these.
 enum WriteError : std::uint32_t {
     NoError = 0,
     UnknownAdapter = 1,

@@ -33,7 +33,9 @@ std::shared_ptr<Backend> makeSimulator(const BackendChoice& choice) {
 
 Claim claimOfDevlink(const BackendChoice&) {
     devlink::LinuxMachine machine;
-    return devlink::findPciFunctions(machine).empty() ? Claim::Possible : Claim::Present;
+    const auto functions = devlink::findPciFunctions(machine);
+    // What cannot be read may be there.
+    return functions && functions->empty() ? Claim::Possible : Claim::Present;
 }
 
 std::shared_ptr<Backend> makeDevlink(const BackendChoice&) {

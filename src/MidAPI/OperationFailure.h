@@ -20,6 +20,13 @@ class OperationFailure : public std::runtime_error {
     std::uint32_t m_code;
 };
 
+/// The code of a failure that has an errno value: that value, unless it is one of the adapter API's own
+/// numbers, which mean other things.
+inline std::uint32_t codeOf(int error) {
+    return error <= static_cast<int>(WriteError::DeviceFailed) ? WriteError::DeviceFailed
+                                                               : static_cast<std::uint32_t>(error);
+}
+
 /// Runs an operation and turns what it throws into the adapter API's code and text. The log has
 /// it, too. AdapterError passes through.
 /// @param subject  what the log calls the adapter: "adapter 0000:05:00.0"

@@ -23,19 +23,23 @@ namespace ma {
 
 class Backend;
 
-/// Names of all adapter ports, in the backend's order; empty when there are none.
+/// Names of all adapter ports, in the backend's order; empty when there are none. Throws AdapterError where
+/// they cannot be listed.
 QUENX_EXPORT utils::StringArray enumerateAdapters();
 
 /// PCI location of a port; its string is the full address text, domain included. Functions of one card have
-/// equal bus and device. Throws AdapterError for an unknown name.
+/// equal domain, bus and device. Throws AdapterError for an unknown name; a port that has gone may still be
+/// known.
 QUENX_EXPORT utils::PCIAddr getPCIAddress(std::string adapter);
 
 /// True when the port's firmware can be updated; false for an unknown name.
 QUENX_EXPORT bool getCanBeUpdated(std::string adapter);
 
 /// Fills `components` with the firmware components on the port, in ascending order of type; the version is
-/// the code revision of the image (0 to 65535). Returns false, and fills nothing, for an unknown name. Throws
-/// AdapterError when the adapter cannot be read.
+/// a number that orders them: of an option ROM its code revision (0 to 65535), of a driver's "1.2.3" its
+/// fields as bytes (0x01020300), and 0 where the driver's text is no such version: AdapterInfo::versions has
+/// that. What is of no image type is one entry of type 0. Returns false, and fills nothing, for an unknown
+/// name. Throws AdapterError when the adapter cannot be read.
 QUENX_EXPORT bool getAdapterFirmwareVersion(std::string adapter,
                                             std::vector<utils::FirmwareVersionInfo>& components);
 
@@ -54,9 +58,11 @@ QUENX_EXPORT int prepareFlashImage(std::string adapter, const std::uint8_t* file
                                    std::uint8_t* output, std::uint32_t* imageSize,
                                    std::vector<utils::FirmwareType>& types);
 
-/// Writes a prepared image to a port: images of the types in it replace those on the port, the others stay.
-/// Blocks until done. Returns true and leaves 0 and an empty text on success, false with a WriteError (or the
-/// device's own code) and its text otherwise; the old firmware is then whole.
+/// Writes a prepared image to a port: images of the types that were prepared replace those on the port, the
+/// others stay; the whole device is one where no types were named and the backend does not know the format.
+/// Blocks until done. Returns true and leaves 0 and an empty text on success, false with a WriteError (or an
+/// errno value above those) and its text otherwise. The old firmware is then whole, or the text says what the
+/// flash holds, as far as that is known.
 QUENX_EXPORT bool writeFlashImage(std::string adapter, const std::uint8_t* image, std::uint32_t imageSize,
                                   std::uint32_t& errorCode, std::string& errorText);
 
@@ -66,8 +72,8 @@ QUENX_EXPORT bool updateCapabilityWord(std::string adapter, std::vector<utils::F
                                        std::uint32_t& errorCode, std::string& errorText);
 
 /// Percentage, 0 to 100, of the update of this port: 0 from a prepare to its write, 100 once the new image is
-/// the one that the port boots. Never goes back during a write, and stays until the next prepare. 0 for an
-/// unknown name.
+/// in the flash for certain; AdapterInfo::resetNeeded says what it takes to run it. Never goes back during a
+/// write, and stays until the next prepare. 0 for an unknown name.
 QUENX_EXPORT std::uint16_t getFlashImageUpdateProgress(std::string adapter);
 
 /// Sets the boot protocol of a port. Returns false when that failed.

@@ -16,9 +16,9 @@ namespace ma::devlink {
 /// flashed. @throws std::system_error when the question cannot be sent
 QUENX_EXPORT bool offersActivation(DevlinkConnection& connection, const std::string& address);
 
-/// Has the driver do it, and waits until the interfaces of the card's functions are back with their links,
-/// for Machine::patience() twelve times. Whoever calls holds the card's lock, and has looked at what runs
-/// over it.
+/// Has the driver do it, waits until the interfaces of the card's functions are back with their links, for
+/// Machine::patience() twelve times, and reads which firmware runs then: the acknowledgement alone proves
+/// nothing. Whoever calls holds the card's lock, and has looked at what runs over it.
 /// @throws std::system_error when the request cannot be sent
 QUENX_EXPORT Activation activateDevice(Machine& machine, const std::string& address,
                                        const utils::StringArray& functions);

@@ -18,7 +18,8 @@ namespace ma::devlink {
 /// of the address in common, and what tells one serial number.
 class QUENX_EXPORT CardLock {
   public:
-    /// Makes the folder if need be. @throws std::system_error when there can be no lock
+    /// Makes the folder if need be. @throws std::system_error when there can be no lock, and os::ForeignFile
+    /// where it, or its folder, is another user's
     /// @param patience  how long to wait for another holder, see isHeld()
     CardLock(Machine& machine, const std::string& folder, const PciFunction& function, const DeviceInfo& info,
              std::chrono::milliseconds patience);

@@ -16,10 +16,7 @@ FlashVerdict askFlashable(DevlinkConnection& connection, const std::string& addr
     if (error == EINVAL && missingType == DEVLINK_ATTR_FLASH_UPDATE_FILE_NAME) return {Flashable::Yes, ""};
     if (error == EOPNOTSUPP)
         return {Flashable::NotOffered, "its driver does not offer updates through devlink"};
-    if (error == EPERM)
-        return {
-            Flashable::NotPermitted,
-            "this takes the capability CAP_NET_ADMIN in the machine's own user namespace; run it as root"};
+    if (error == EPERM) return {Flashable::NotPermitted, kTakesPrivilege};
     if (error == ENODEV)
         return {Flashable::Absent,
                 "devlink does not know it; its driver has no devlink, or it is in another network namespace"};
@@ -39,8 +36,20 @@ std::string refusalOfComponent(DevlinkConnection& connection, const std::string&
     return isAccepted ? "" : describe(answer);
 }
 
-Answer askInfo(DevlinkConnection& connection, const std::string& address) {
-    return connection.ask(DEVLINK_CMD_INFO_GET, address);
+ToldInfo askInfo(DevlinkConnection& connection, const std::string& address) {
+    const Answer answer = connection.ask(DEVLINK_CMD_INFO_GET, address);
+    if (!answer.isLost && answer.result.error == 0) return {.info = readDeviceInfo(answer.attributes)};
+    // A driver need not tell anything.
+    if (!answer.isLost && answer.result.error == EOPNOTSUPP) return {};
+    return {.error = describe(answer)};
+}
+
+ToldInfo askInfoAnew(Machine& machine, const std::string& address) try {
+    DevlinkConnection connection(machine);
+    if (connection.family().number == 0) return {.error = "this kernel has no devlink any more"};
+    return askInfo(connection, address);
+} catch (const std::system_error& error) {
+    return {.error = error.what()};
 }
 
 Answer flash(DevlinkConnection& connection, const std::string& address, const std::string& file,
@@ -53,8 +62,16 @@ Answer flash(DevlinkConnection& connection, const std::string& address, const st
 
 std::string describe(const Answer& answer) {
     if (answer.isLost) return "the kernel's answer did not come";
-    const std::string reason = std::generic_category().message(answer.result.error);
-    return answer.result.text.empty() ? reason : answer.result.text + " (" + reason + ")";
+    const auto& [error, text, offset, missingType] = answer.result;
+    const std::string reason = std::generic_category().message(error);
+    if (error == ENOENT && text == "failed to locate the requested firmware file")
+        return text + " (" + reason +
+               "). The kernel looks for the file in the machine's own folders: outside a container it finds "
+               "it";
+    if (!text.empty()) return text + " (" + reason + ")";
+    if (error == EPERM) return reason + "; " + kTakesPrivilege;
+    if (error == ENODEV) return reason + ". The device is gone, or in another network namespace";
+    return reason;
 }
 
 }  // namespace ma::devlink

@@ -24,6 +24,8 @@ namespace {
 // The packages' state folder, where a hardened daemon may write, too.
 constexpr const char* kLockFolder = "/var/lib/quenx/locks";
 constexpr std::chrono::milliseconds kLockPatience{3000};
+// What was prepared is written at once; what was not by then was only checked.
+constexpr std::chrono::seconds kPreparationPending{30};
 
 std::string unknown(const std::string& adapter) {
     return "there is no adapter " + adapter;
@@ -45,7 +47,7 @@ void requireFlashable(const KnownFunction& known) {
     if (canNeverBeUpdated(flash))
         throw OperationFailure(WriteError::NotUpdatable, "this adapter cannot be updated: " + flash.reason);
     if (flash.flashable == Flashable::NotPermitted)
-        throw OperationFailure(EPERM, "this process may not update the adapter: " + flash.reason);
+        throw OperationFailure(codeOf(EPERM), "this process may not update the adapter: " + flash.reason);
     if (flash.flashable != Flashable::Unknown) return;
     if (!known.writer.empty()) refuseAsBusy("its card", known.writer);
     throw OperationFailure(WriteError::DeviceFailed, "the adapter cannot be asked: " + flash.reason);
@@ -61,11 +63,11 @@ ResetNeeded resetNeeded(const KnownFunction& known) {
     return std::ranges::any_of(versions, isTold) ? ResetNeeded::None : ResetNeeded::Unknown;
 }
 
-/// By the places on the bus, or by what the board says of itself.
-bool areOnOneCard(const KnownFunction& left, const KnownFunction& right) {
-    const auto isSame = [](const std::string& a, const std::string& b) { return !a.empty() && a == b; };
-    return left.pci.card() == right.pci.card() || isSame(left.info.serialNumber, right.info.serialNumber) ||
-           isSame(left.info.boardSerialNumber, right.info.boardSerialNumber);
+/// What cannot be read must not be taken for what is not there.
+void requireVersions(const KnownFunction& known) {
+    if (!known.infoError.empty())
+        throw AdapterError("the firmware versions of adapter " + known.pci.address +
+                           " cannot be read: " + known.infoError);
 }
 
 }  // namespace
@@ -85,7 +87,9 @@ utils::StringArray DevlinkBackend::enumerateAdapters() {
 }
 
 utils::PCIAddr DevlinkBackend::getPCIAddress(const std::string& adapter) {
-    return parseFunctionAddress(require(adapter).pci.address).value_or(utils::PCIAddr());
+    // That of a card which has gone meanwhile is what it was: who compares places need not fail for it.
+    if (!m_table.hasSeen(adapter)) throw AdapterError(unknown(adapter));
+    return parseFunctionAddress(adapter).value_or(utils::PCIAddr());
 }
 
 bool DevlinkBackend::getCanBeUpdated(const std::string& adapter) {
@@ -99,14 +103,17 @@ bool DevlinkBackend::getCanBeUpdated(const std::string& adapter) {
 bool DevlinkBackend::getAdapterFirmwareVersion(const std::string& adapter,
                                                std::vector<utils::FirmwareVersionInfo>& components) {
     const auto known = m_table.find(adapter);
-    if (known) components = m_settings.components.installed(known->info.versions);
-    return known.has_value();
+    if (!known) return false;
+    requireVersions(*known);
+    components = m_settings.components.installed(known->info.versions);
+    return true;
 }
 
 int DevlinkBackend::prepareFlashImage(const std::string& adapter, const std::uint8_t* file,
                                       std::uint32_t fileSize, std::uint8_t* output, std::uint32_t* imageSize,
                                       std::vector<utils::FirmwareType>& types) try {
-    const auto known = m_table.find(adapter);
+    // What another program has written since must not be taken for what is installed.
+    const auto known = m_table.find(adapter, AdapterTable::Ask::Anew);
     const auto buffers = ImageBuffers::of(file, fileSize, output, imageSize);
     if (!known || !buffers) {
         QUENX_ERROR("adapter %s: status %d: %s", adapter.c_str(), PrepareStatus::InvalidParameter,
@@ -118,14 +125,30 @@ int DevlinkBackend::prepareFlashImage(const std::string& adapter, const std::uin
     if (!verdict.reason.empty())
         QUENX_ERROR("adapter %s: status %d: %s", adapter.c_str(), verdict.status, verdict.reason.c_str());
     if (!hasOutput(verdict.status)) return verdict.status;
+    remember(adapter, buffers->file, verdict.components);
     *imageSize = buffers->copyFile();
     types = verdict.types;
-    const utils::Mutex::AutoLocker lock(m_preparedMutex);
-    m_prepared[adapter] = {fileSize, crc32(buffers->file), verdict.components};
     return verdict.status;
 } catch (const std::exception& error) {
     QUENX_ERROR("adapter %s: status %d: %s", adapter.c_str(), PrepareStatus::UnspecifiedError, error.what());
     return PrepareStatus::UnspecifiedError;
+}
+
+bool DevlinkBackend::Prepared::isOf(std::span<const std::uint8_t> image) const {
+    return size == image.size() && checksum == crc32(image);
+}
+
+/// The write is told the bytes alone, so these must not mean two things at a time.
+void DevlinkBackend::remember(const std::string& adapter, std::span<const std::uint8_t> image,
+                              const std::vector<std::string>& components) {
+    const auto now = std::chrono::steady_clock::now();
+    const utils::Mutex::AutoLocker lock(m_preparedMutex);
+    Prepared& prepared = m_prepared[adapter];
+    if (now < prepared.end && prepared.components != components && prepared.isOf(image))
+        throw OperationFailure(WriteError::Busy,
+                               "the same image was just prepared for other image types and is about to be "
+                               "written; try again in half a minute");
+    prepared = {image.size(), crc32(image), components, now + kPreparationPending};
 }
 
 PackageVerdict DevlinkBackend::assess(const KnownFunction& known, std::span<const std::uint8_t> file,
@@ -141,6 +164,8 @@ PackageVerdict DevlinkBackend::assess(const KnownFunction& known, std::span<cons
     if (!hasOutput(verdict.status)) return verdict;
     // What is wrong with the file comes first: another one is needed whoever writes it.
     requireFlashable(known);
+    if (!known.writer.empty()) refuseAsBusy("its card", known.writer);
+    requireVersions(known);
     stagingFolder();
     for (const std::string& unchecked : verdict.unchecked)
         QUENX_DEBUG("adapter %s: it could not be checked %s", known.pci.address.c_str(), unchecked.c_str());
@@ -164,18 +189,28 @@ bool DevlinkBackend::writeFlashImage(const std::string& adapter, const std::uint
 }
 
 void DevlinkBackend::write(const std::string& adapter, std::span<const std::uint8_t> image) {
-    const auto known = m_table.find(adapter);
+    const auto known = m_table.find(adapter, AdapterTable::Ask::Anew);
     if (!known) throw OperationFailure(WriteError::UnknownAdapter, unknown(adapter));
-    FlashOrder order{*known, "", image, preparedComponents(adapter, image)};
+    const std::vector<std::string> components = takePrepared(adapter, image);
     // Said before the lock is tried, which takes rights of its own.
     if (known->flash.flashable != Flashable::Unknown) requireFlashable(*known);
     const CardLock lock(*m_machine, kLockFolder, known->pci, known->info, kLockPatience);
     if (!lock.isHeld()) refuseAsBusy("the card of adapter " + adapter, lock.holder());
-    requireFlashable(*known);
-    order.folder = stagingFolder();
+    const FlashOrder order{readUnderLock(adapter), stagingFolder(), image, components};
     const AdapterTable::FlashScope flashing(m_table, adapter);
-    const WritingScope writing(*known->progress);
+    const WritingScope writing(*order.function.progress);
     runFlash(*m_machine, order, [this] { m_table.readNotifications(); });
+}
+
+/// What is known once nobody of this product can change the card any more. Others may: they take no lock, but
+/// the kernel tells of them.
+KnownFunction DevlinkBackend::readUnderLock(const std::string& adapter) {
+    auto known = m_table.find(adapter, AdapterTable::Ask::AnewAsHolder);
+    if (!known) throw OperationFailure(ENODEV, "adapter " + adapter + " is gone");
+    const std::string flashed = m_table.findFlashedElsewhere(*known);
+    if (!flashed.empty()) refuseAsBusy("function " + flashed + " of the card", "another program");
+    requireFlashable(*known);
+    return *std::move(known);
 }
 
 std::string DevlinkBackend::stagingFolder() try {
@@ -184,14 +219,14 @@ std::string DevlinkBackend::stagingFolder() try {
     throw OperationFailure(EACCES, error.what());
 }
 
-std::vector<std::string> DevlinkBackend::preparedComponents(const std::string& adapter,
-                                                            std::span<const std::uint8_t> image) {
-    const std::uint32_t checksum = crc32(image);
+std::vector<std::string> DevlinkBackend::takePrepared(const std::string& adapter,
+                                                      std::span<const std::uint8_t> image) {
     const utils::Mutex::AutoLocker lock(m_preparedMutex);
     const auto found = m_prepared.find(adapter);
-    if (found == m_prepared.end() || found->second.size != image.size() || found->second.checksum != checksum)
+    if (found == m_prepared.end() || !found->second.isOf(image))
         throw OperationFailure(WriteError::BadImage,
                                "this image was not prepared for adapter " + adapter + "; prepare it first");
+    found->second.end = {};
     return found->second.components;
 }
 
@@ -217,6 +252,7 @@ bool DevlinkBackend::setBootType(const std::string& adapter, BootType type) {
 
 AdapterInfo DevlinkBackend::getAdapterInfo(const std::string& adapter) {
     const KnownFunction known = require(adapter);
+    requireVersions(known);
     const InterfaceState state = readInterfaceState(*m_machine, known.pci);
     AdapterInfo info;
     info.permanentMac = state.mac;
@@ -242,23 +278,31 @@ std::string DevlinkBackend::describeSearch() {
     const utils::StringArray names = m_table.names();
     std::string text = "Ethernet adapters were looked for on PCI (class 0200 in /sys/bus/pci/devices): " +
                        std::to_string(names.size()) + (names.size() == 1 ? " was found." : " were found.");
+    utils::StringArray others;
     for (const std::string& name : names) {
-        const auto known = m_table.find(name);
+        // From memory: a service that starts has no reason to wait for a device.
+        const auto known = m_table.find(name, AdapterTable::Ask::Never);
         if (!known || known->flash.flashable == Flashable::Yes) continue;
+        if (known->writer.empty() && known->flash.reason.empty()) {
+            others.push_back(name);
+            continue;
+        }
         text += " " + name + " (" + (known->pci.driver.empty() ? "no driver" : known->pci.driver) + ") " +
                 (known->writer.empty() ? "cannot be updated: " + known->flash.reason
                                        : "is being written to by " + known->writer) +
                 ".";
     }
+    if (!others.empty()) text += " Not asked yet: " + utils::joined(others) + ".";
     return text;
 }
 
 std::optional<ImageVerdict> DevlinkBackend::judgeImage(const std::string& adapter,
                                                        std::span<const std::uint8_t> file,
                                                        const std::vector<utils::FirmwareType>& types) {
-    const KnownFunction known = require(adapter);
+    const auto known = m_table.find(adapter, AdapterTable::Ask::Anew);
+    if (!known) throw AdapterError(unknown(adapter));
     try {
-        return assess(known, file, types);
+        return assess(*known, file, types);
     } catch (const std::exception& error) {
         return ImageVerdict{.status = PrepareStatus::UnspecifiedError, .reason = error.what()};
     }
@@ -266,13 +310,13 @@ std::optional<ImageVerdict> DevlinkBackend::judgeImage(const std::string& adapte
 
 CardUse DevlinkBackend::getCardUse(const std::string& adapter, const std::string& caller) {
     const KnownFunction known = require(adapter);
-    CardUse use;
+    utils::StringArray sameBoard;
     for (const std::string& name : m_table.names()) {
         const auto each = m_table.find(name);
-        if (!each || !areOnOneCard(known, *each)) continue;
-        use.functions.push_back(name);
-        use.interfaces.insert(use.interfaces.end(), each->pci.interfaces.begin(), each->pci.interfaces.end());
+        if (each && areOnOneCard(known, *each)) sameBoard.push_back(name);
     }
+    CardFunctions card = readCard(*m_machine, known.pci.card(), sameBoard);
+    CardUse use{.functions = std::move(card.functions), .interfaces = std::move(card.interfaces)};
     findNetworkUse(*m_machine, caller, use);
     return use;
 }
@@ -285,11 +329,16 @@ Activation DevlinkBackend::activate(const std::string& adapter, const Activation
         return {Activation::WouldDisrupt, utils::joined(use.losses, "; ")};
     if (known.flash.flashable == Flashable::NotPermitted) return {Activation::Failed, known.flash.reason};
     const CardLock lock(*m_machine, kLockFolder, known.pci, known.info, kLockPatience);
-    if (!lock.isHeld()) return {Activation::Failed, "the card is being written to by " + lock.holder()};
+    if (!lock.isHeld()) refuseAsBusy("the card", lock.holder());
+    const std::string flashed = m_table.findFlashedElsewhere(known);
+    if (!flashed.empty()) refuseAsBusy("function " + flashed + " of the card", "another program");
     // The device answers nothing meanwhile, and has to be asked anew afterwards.
     const AdapterTable::FlashScope resetting(m_table, adapter);
     return activateDevice(*m_machine, adapter, use.functions);
-} catch (const std::system_error& error) {
+} catch (const AdapterError&) {
+    throw;
+} catch (const std::exception& error) {
+    // Nothing that throws comes behind the request to the driver.
     return {Activation::Failed, error.what()};
 }
 

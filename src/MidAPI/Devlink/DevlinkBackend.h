@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include <chrono>
 #include <cstdint>
 #include <map>
 #include <memory>
@@ -57,16 +58,21 @@ class QUENX_EXPORT DevlinkBackend : public Backend {
         std::size_t size = 0;
         std::uint32_t checksum = 0;
         std::vector<std::string> components;
+        std::chrono::steady_clock::time_point end;  ///< until then the write is expected
+
+        bool isOf(std::span<const std::uint8_t> image) const;
     };
 
     KnownFunction require(const std::string& adapter);
     PackageVerdict assess(const KnownFunction& known, std::span<const std::uint8_t> file,
                           const std::vector<utils::FirmwareType>& types);
     bool accepts(const KnownFunction& known, const std::string& component);
+    void remember(const std::string& adapter, std::span<const std::uint8_t> image,
+                  const std::vector<std::string>& components);
     void write(const std::string& adapter, std::span<const std::uint8_t> image);
+    KnownFunction readUnderLock(const std::string& adapter);
     std::string stagingFolder();
-    std::vector<std::string> preparedComponents(const std::string& adapter,
-                                                std::span<const std::uint8_t> image);
+    std::vector<std::string> takePrepared(const std::string& adapter, std::span<const std::uint8_t> image);
 
     const Settings m_settings;
     const std::shared_ptr<Machine> m_machine;

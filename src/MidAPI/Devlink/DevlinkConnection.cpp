@@ -17,17 +17,16 @@ namespace {
 // The kernel's datagrams have 32 KiB at most.
 constexpr std::size_t kLargestDatagram = std::size_t{64} * 1024;
 
-/// One datagram; nothing when none comes in time. An empty one where the kernel says that some were lost.
-std::optional<Bytes> receive(Machine& machine, const os::Descriptor& socket,
-                             std::chrono::milliseconds patience) try {
-    Bytes datagram(kLargestDatagram);
-    const auto length = machine.receive(socket, datagram, patience);
+/// One datagram, in the buffer; nothing when none comes in time. An empty one where the kernel says that some
+/// were lost.
+std::optional<ByteView> receive(Machine& machine, const os::Descriptor& socket, Bytes& buffer,
+                                std::chrono::milliseconds patience) try {
+    const auto length = machine.receive(socket, buffer, patience);
     if (!length || *length == 0) return std::nullopt;
-    datagram.resize(*length);
-    return datagram;
+    return ByteView(buffer).first(*length);
 } catch (const std::system_error& error) {
     if (error.code().value() != ENOBUFS) throw;
-    return Bytes();
+    return ByteView();
 }
 
 }  // namespace
@@ -56,7 +55,10 @@ Answer DevlinkConnection::ask(std::uint8_t command, const std::string& address, 
 
 Answer DevlinkConnection::exchange(std::uint16_t family, RequestWriter request) {
     using Clock = std::chrono::steady_clock;
-    m_machine.send(m_socket, request.take());
+    const Bytes message = request.take();
+    // Beforehand: when the kernel has done what it was asked for, that must not count as a failure.
+    Bytes buffer(kLargestDatagram);
+    m_machine.send(m_socket, message);
     // Not before: what was asked for is done within the sending, and may take minutes.
     const auto end = Clock::now() + m_machine.patience();
     const auto rest = [end] {
@@ -66,9 +68,9 @@ Answer DevlinkConnection::exchange(std::uint16_t family, RequestWriter request) 
     try {
         Answer answer;
         // What has come by then is read, too: an answer is of two datagrams.
-        while (const auto datagram = receive(m_machine, m_socket, rest()))
+        while (const auto datagram = receive(m_machine, m_socket, buffer, rest()))
             if (read(*datagram, family, answer)) return answer;
-    } catch (const std::system_error& error) {
+    } catch (const std::exception& error) {
         // An answer that cannot be read is as good as none: the request may have been done.
         QUENX_ERROR("what the kernel answers to a request cannot be read: %s", error.what());
     }
@@ -91,12 +93,15 @@ bool DevlinkConnection::read(ByteView datagram, std::uint16_t family, Answer& an
 }
 
 Notifications::Notifications(Machine& machine, const Family& family)
-    : m_machine(machine), m_family(family.number), m_socket(machine.openNetlink()) {
+    : m_machine(machine),
+      m_family(family.number),
+      m_socket(machine.openNetlink()),
+      m_buffer(kLargestDatagram) {
     machine.joinGroup(m_socket, family.notifications);
 }
 
 std::optional<Notifications::Batch> Notifications::next(std::chrono::milliseconds patience) {
-    const auto datagram = receive(m_machine, m_socket, patience);
+    const auto datagram = receive(m_machine, m_socket, m_buffer, patience);
     if (!datagram) return std::nullopt;
     Batch batch{.messages = {}, .lostSome = datagram->empty()};
     for (const Message& message : readMessages(*datagram))

@@ -36,7 +36,8 @@ class QUENX_EXPORT DevlinkConnection {
     using Writer = std::function<void(RequestWriter&)>;
 
     /// One request about a PCI function. Waits for as long as somebody else keeps the device busy: a flash
-    /// makes all other requests wait until it is over. @throws std::system_error when it cannot be sent
+    /// makes all other requests wait until it is over. @throws std::system_error when it cannot be sent, and
+    /// never once it was: then an answer that cannot be had is lost
     Answer ask(std::uint8_t command, const std::string& address, const Writer& write = {});
 
   private:
@@ -67,6 +68,7 @@ class QUENX_EXPORT Notifications {
     Machine& m_machine;
     const std::uint16_t m_family;
     const os::Descriptor m_socket;
+    Bytes m_buffer;
 };
 
 }  // namespace ma::devlink

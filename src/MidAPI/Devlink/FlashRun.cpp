@@ -9,39 +9,22 @@
 #include "MidAPI/Devlink/StagedImage.h"
 #include "MidAPI/OperationFailure.h"
 #include "Utils/Log.h"
+#include "Utils/Utils.h"
 
 namespace ma::devlink {
 namespace {
 
 [[noreturn]] void fail(int error, const std::string& text) {
-    throw OperationFailure(static_cast<std::uint32_t>(error), text);
+    throw OperationFailure(codeOf(error), text);
 }
 
 /// Names and values of what is in the flash, for a comparison; empty where the driver does not tell.
-std::string storedVersions(DevlinkConnection& connection, const std::string& address) {
-    const Answer answer = askInfo(connection, address);
-    if (answer.isLost || answer.result.error != 0) return {};
+std::string storedVersions(const ToldInfo& told) {
     std::string stored;
-    for (const NamedVersion& version : readDeviceInfo(answer.attributes).versions)
+    for (const NamedVersion& version : told.info.versions)
         if (!version.stored.empty())
             stored += (stored.empty() ? "" : ", ") + version.name + ' ' + version.stored;
     return stored;
-}
-
-/// What a user can do about an error of the kernel's.
-std::string advice(int error) {
-    switch (error) {
-        case ENOENT:
-            return ". The kernel looks for the file in the machine's own folders: outside a container it "
-                   "finds it";
-        case EPERM:
-            return ". Flashing takes the capability CAP_NET_ADMIN in the machine's own user namespace: run "
-                   "it as root";
-        case ENODEV:
-            return ". The device is gone, or in another network namespace";
-        default:
-            return {};
-    }
 }
 
 /// One update: the flashes of one image.
@@ -60,8 +43,8 @@ class FlashRun {
     }
 
     /// @param component  empty for the whole device
-    void flashOne(const std::string& component) {
-        const std::string before = storedVersions(m_connection, m_address);
+    void flashOne(const std::string& component) try {
+        const std::string before = storedVersions(askInfo(m_connection, m_address));
         // Listening before the request: what is told meanwhile is told once.
         FlashWatch watch(m_machine, m_connection.family(), m_address, [this](const FlashStatus& status) {
             m_progress.report(status);
@@ -72,33 +55,48 @@ class FlashRun {
         if (answer.isLost)
             resolve(before);
         else if (answer.result.error != 0)
-            refuse(answer, watch.lastText());
+            refuse(component, answer, watch.lastText());
         m_progress.partDone();
+        m_written.push_back(component);
+    } catch (const std::system_error& error) {
+        fail(error.code().value(), whatFailed(component) + error.what() + whatIsLeft());
     }
 
   private:
-    [[noreturn]] static void refuse(const Answer& answer, const std::string& lastText) {
-        std::string text = "the update failed: " + describe(answer);
+    [[noreturn]] void refuse(const std::string& component, const Answer& answer,
+                             const std::string& lastText) const {
+        std::string text = whatFailed(component) + describe(answer);
         if (answer.result.text.empty() && !lastText.empty())
             text += "; the driver's last words were: " + lastText;
-        fail(answer.result.error, text + advice(answer.result.error));
+        fail(answer.result.error, text + whatIsLeft());
+    }
+
+    static std::string whatFailed(const std::string& component) {
+        return component.empty() ? "the update failed: " : "the update of " + component + " failed: ";
+    }
+
+    /// What a failure has left in the flash.
+    std::string whatIsLeft() const {
+        const std::string stored = storedVersions(askInfoAnew(m_machine, m_address));
+        return (stored.empty() ? kNotTold : "; the flash holds " + stored) +
+               (m_written.empty() ? "" : "; before it " + utils::joined(m_written) + " was written");
     }
 
     /// Nobody has told how the flash ended, but what is stored does, where it has changed.
-    void resolve(const std::string& before) {
-        DevlinkConnection fresh(m_machine);  // the old one may be the reason
-        const std::string after = storedVersions(fresh, m_address);
+    void resolve(const std::string& before) const {
+        const std::string after = storedVersions(askInfoAnew(m_machine, m_address));
         if (!after.empty() && after != before) {
             QUENX_ERROR(
                 "adapter %s: the kernel did not tell how the update ended, but the flash now holds %s",
                 m_address.c_str(), after.c_str());
             return;
         }
-        fail(ETIMEDOUT, "the kernel did not tell how the update ended, and " +
-                            (after.empty() ? "the driver does not tell what is in the flash"
-                                           : "the flash holds " + after + ", as before") +
+        fail(ETIMEDOUT, "the kernel did not tell how the update ended" +
+                            (after.empty() ? kNotTold : "; the flash holds " + after + ", as before") +
                             "; look at the adapter's versions, and update it again");
     }
+
+    inline static const std::string kNotTold = "; the driver does not tell what is in the flash";
 
     Machine& m_machine;
     DevlinkConnection m_connection;
@@ -106,6 +104,7 @@ class FlashRun {
     const StagedImage m_staged;
     FlashProgress m_progress;
     const std::function<void()>& m_onStatus;
+    std::vector<std::string> m_written;
 };
 
 }  // namespace

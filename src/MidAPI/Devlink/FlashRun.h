@@ -24,8 +24,9 @@ struct FlashOrder {
 /// Flashes a function; blocks until the device is done, and moves the function's progress. Whoever calls
 /// holds the card's lock.
 /// @param onStatus  called on another thread whenever the driver says how far it is
-/// @throws OperationFailure  with the kernel's error code and words, or an errno value of this side's. A
-///         flash that failed may have changed the device; the ones after it are not begun.
+/// @throws OperationFailure  with codeOf() the error, the words of kernel or driver, the component, and what
+///         is in the flash as far as the driver tells it. A flash that failed may have changed the device;
+///         the ones after it are not begun.
 QUENX_EXPORT void runFlash(Machine& machine, const FlashOrder& order, const std::function<void()>& onStatus);
 
 }  // namespace ma::devlink

@@ -5,10 +5,13 @@
 #include <poll.h>
 #include <sys/socket.h>
 #include <sys/stat.h>
+#include <sys/utsname.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <array>
 #include <cerrno>
+#include <filesystem>
 #include <system_error>
 
 #include "MidAPI/Devlink/Machine.h"
@@ -63,16 +66,29 @@ std::optional<std::string> LinuxMachine::readLink(const std::string& path) {
     return std::string(target.data(), static_cast<std::size_t>(length));
 }
 
-utils::StringArray LinuxMachine::listFolder(const std::string& path) {
-    return os::listDirectory(path);
+std::optional<utils::StringArray> LinuxMachine::listFolder(const std::string& path) {
+    utils::StringArray names;
+    std::error_code error;
+    std::filesystem::directory_iterator entry(path, error);
+    for (; !error && entry != std::filesystem::directory_iterator(); entry.increment(error))
+        names.push_back(entry->path().filename());
+    if (error && error.value() != ENOENT && error.value() != ENOTDIR) return std::nullopt;
+    std::ranges::sort(names);
+    return names;
 }
 
 bool LinuxMachine::folderExists(const std::string& path) {
-    return os::isThisADir(path);
+    struct stat status {};
+    return ::stat(path.c_str(), &status) == 0 && S_ISDIR(status.st_mode);
 }
 
 bool LinuxMachine::folderIsWritable(const std::string& path) {
-    return os::isThisADir(path) && ::faccessat(AT_FDCWD, path.c_str(), W_OK | X_OK, AT_EACCESS) == 0;
+    return folderExists(path) && ::faccessat(AT_FDCWD, path.c_str(), W_OK | X_OK, AT_EACCESS) == 0;
+}
+
+std::string LinuxMachine::kernelRelease() {
+    utsname names{};
+    return ::uname(&names) == 0 ? names.release : "";
 }
 
 os::Descriptor LinuxMachine::openNetlink() {

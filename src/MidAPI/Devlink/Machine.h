@@ -18,7 +18,8 @@ namespace ma::devlink {
 
 /// What the devlink backend has of the machine that it runs on: every file, socket and lock. Tests bring
 /// machines of their own. What reads never throws; what changes something, and the sockets, throw
-/// std::system_error, which says what could not be done and why. Any thread may call.
+/// std::system_error, which says what could not be done and why. A folder or a lock that is another user's is
+/// os::ForeignFile. Any thread may call.
 class QUENX_EXPORT Machine {
   public:
     Machine() = default;
@@ -31,11 +32,14 @@ class QUENX_EXPORT Machine {
     virtual std::optional<std::string> readFile(const std::string& path) = 0;
     /// What a symbolic link holds; nothing for anything else.
     virtual std::optional<std::string> readLink(const std::string& path) = 0;
-    /// The names in a folder, sorted; none when it cannot be read.
-    virtual utils::StringArray listFolder(const std::string& path) = 0;
+    /// The names in a folder, sorted: none where there is no such folder. Nothing when it cannot be read,
+    /// which is not the same: this process may have too many files open.
+    virtual std::optional<utils::StringArray> listFolder(const std::string& path) = 0;
     virtual bool folderExists(const std::string& path) = 0;
     /// True for a folder in which this process may make files: it lets it, and is not on a read-only system.
     virtual bool folderIsWritable(const std::string& path) = 0;
+    /// The kernel's release, "6.1.0-18-amd64": by uname(), since a service may be kept from most of procfs.
+    virtual std::string kernelRelease() = 0;
 
     /// A generic-netlink socket, bound, with the kernel's texts for errors and short acknowledgements.
     virtual os::Descriptor openNetlink() = 0;
@@ -74,9 +78,10 @@ class QUENX_EXPORT LinuxMachine : public Machine {
   public:
     std::optional<std::string> readFile(const std::string& path) override;
     std::optional<std::string> readLink(const std::string& path) override;
-    utils::StringArray listFolder(const std::string& path) override;
+    std::optional<utils::StringArray> listFolder(const std::string& path) override;
     bool folderExists(const std::string& path) override;
     bool folderIsWritable(const std::string& path) override;
+    std::string kernelRelease() override;
     os::Descriptor openNetlink() override;
     void joinGroup(const os::Descriptor& socket, std::uint32_t group) override;
     void send(const os::Descriptor& socket, std::span<const std::uint8_t> message) override;

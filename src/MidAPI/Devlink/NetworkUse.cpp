@@ -16,6 +16,8 @@ std::string netFolder(const std::string& interface) {
     return "/sys/class/net/" + interface;
 }
 
+const utils::StringArray kNone;
+
 /// Follows the interfaces of a card up to those that would lose their way out with it.
 class Stack {
   public:
@@ -36,7 +38,7 @@ class Stack {
     utils::StringArray uppersOf(const std::string& interface) const {
         constexpr std::string_view kPrefix = "upper_";
         utils::StringArray uppers;
-        for (const std::string& entry : m_machine.listFolder(netFolder(interface)))
+        for (const std::string& entry : m_machine.listFolder(netFolder(interface)).value_or(kNone))
             if (entry.starts_with(kPrefix)) uppers.push_back(entry.substr(kPrefix.size()));
         return uppers;
     }
@@ -86,6 +88,7 @@ utils::StringArray interfacesOf(const std::vector<PciFunction>& functions, const
 void findNetworkUse(Machine& machine, const std::string& caller, CardUse& use) {
     const Stack stack(machine, use);
     const Routes routes(machine);
+    if (!routes.areKnown()) use.losses.emplace_back("the routes cannot be read");
     for (const std::string& interface : routes.defaultInterfaces())
         if (stack.hasLost(interface)) use.losses.push_back("the default route goes through " + interface);
     const std::string way = caller.empty() ? "" : routes.interfaceTo(caller);
@@ -94,7 +97,7 @@ void findNetworkUse(Machine& machine, const std::string& caller, CardUse& use) {
 }
 
 std::vector<LinkState> linksOf(Machine& machine, const utils::StringArray& functions) {
-    const std::vector<PciFunction> all = findPciFunctions(machine);
+    const std::vector<PciFunction> all = findPciFunctions(machine).value_or(std::vector<PciFunction>());
     std::vector<LinkState> links;
     for (const std::string& function : functions)
         for (const std::string& interface : interfacesOf(all, function))
@@ -103,7 +106,7 @@ std::vector<LinkState> linksOf(Machine& machine, const utils::StringArray& funct
 }
 
 utils::StringArray missingLinks(Machine& machine, const std::vector<LinkState>& before) {
-    const std::vector<PciFunction> all = findPciFunctions(machine);
+    const std::vector<PciFunction> all = findPciFunctions(machine).value_or(std::vector<PciFunction>());
     utils::StringArray missing;
     for (const LinkState& link : before) {
         const utils::StringArray now = interfacesOf(all, link.function);

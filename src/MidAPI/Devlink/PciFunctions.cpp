@@ -25,15 +25,32 @@ PciIds readIds(Machine& machine, const std::string& folder) {
     return {id("/vendor"), id("/device"), id("/subsystem_vendor"), id("/subsystem_device")};
 }
 
+/// What is there and cannot be read.
+struct Unreadable {};
+
+utils::StringArray list(Machine& machine, const std::string& folder) {
+    auto names = machine.listFolder(folder);
+    if (!names) throw Unreadable();
+    return *std::move(names);
+}
+
 /// The folders below which a function's interfaces are. For virtio they are those of the device within it.
 utils::StringArray interfaceFolders(Machine& machine, const std::string& function) {
     utils::StringArray folders;
     if (machine.folderExists(function + "/net")) folders.push_back(function + "/net");
-    for (const std::string& name : machine.listFolder(function)) {
+    for (const std::string& name : list(machine, function)) {
         const std::string inner = function + '/' + name + "/net";
         if (name.starts_with("virtio") && machine.folderExists(inner)) folders.push_back(inner);
     }
     return folders;
+}
+
+utils::StringArray allInterfaces(Machine& machine, const utils::StringArray& folders) {
+    utils::StringArray interfaces;
+    for (const std::string& folder : folders)
+        for (const std::string& interface : list(machine, folder))
+            interfaces.push_back(interface);
+    return interfaces;
 }
 
 /// An interface that stands for a virtual function, or another one, in the switch of the card: the kernel
@@ -44,18 +61,25 @@ bool isRepresentor(Machine& machine, const std::string& interface) {
     return port.starts_with("pf");
 }
 
+/// A function of an Ethernet card that is not a virtual one.
+bool isEthernet(Machine& machine, const std::string& address) {
+    constexpr std::string_view kEthernet = "0x0200";
+    const std::string folder = kDevices + address;
+    const auto code = machine.readFile(folder + "/class");
+    // What was pulled out meanwhile is not there any more, either.
+    if (!code && machine.folderExists(folder)) throw Unreadable();
+    return code.value_or("").starts_with(kEthernet) && parseFunctionAddress(address) &&
+           !machine.readLink(folder + "/physfn");
+}
+
 std::optional<PciFunction> readFunction(Machine& machine, const std::string& address) {
     const std::string folder = kDevices + address;
-    constexpr std::string_view kEthernet = "0x0200";
-    if (!machine.readFile(folder + "/class").value_or("").starts_with(kEthernet)) return std::nullopt;
-    if (!parseFunctionAddress(address) || machine.readLink(folder + "/physfn")) return std::nullopt;
+    if (!isEthernet(machine, address)) return std::nullopt;
     PciFunction function{.address = address, .ids = readIds(machine, folder)};
     const std::string driver = machine.readLink(folder + "/driver").value_or("");
     function.driver = driver.substr(driver.rfind('/') + 1);
     const utils::StringArray folders = interfaceFolders(machine, folder);
-    for (const std::string& interfaces : folders)
-        for (const std::string& interface : machine.listFolder(interfaces))
-            function.interfaces.push_back(interface);
+    function.interfaces = allInterfaces(machine, folders);
     // Where there is a place for interfaces but none in it, they are in another namespace.
     if (!folders.empty() && function.interfaces.empty()) return std::nullopt;
     std::erase_if(function.interfaces,
@@ -77,21 +101,50 @@ std::string PciFunction::card() const {
     return address.substr(0, address.rfind('.'));
 }
 
-std::vector<PciFunction> findPciFunctions(Machine& machine) {
+std::optional<std::vector<PciFunction>> findPciFunctions(Machine& machine) try {
     std::vector<PciFunction> functions;
-    for (const std::string& address : machine.listFolder(kDevices))
+    for (const std::string& address : list(machine, kDevices))
         if (auto function = readFunction(machine, address)) functions.push_back(*std::move(function));
     // The order of the texts is that of the addresses, but for domains of more than four digits.
     std::ranges::stable_sort(functions, {},
                              [](const PciFunction& function) { return function.address.size(); });
     return functions;
+} catch (const Unreadable&) {
+    return std::nullopt;
+}
+
+CardFunctions readCard(Machine& machine, const std::string& card, const utils::StringArray& addresses) try {
+    CardFunctions found;
+    const auto isMeant = [&](const std::string& address) {
+        return std::ranges::find(addresses, address) != addresses.end() ||
+               (address.starts_with(card + '.') && isEthernet(machine, address));
+    };
+    for (const std::string& address : list(machine, kDevices)) {
+        if (!isMeant(address)) continue;
+        found.functions.push_back(address);
+        utils::StringArray folders = interfaceFolders(machine, kDevices + address);
+        for (const std::string& name : list(machine, kDevices + address))
+            if (name.starts_with("virtfn")) {
+                const std::string inner = kDevices + address + '/' + name;
+                for (std::string& folder : interfaceFolders(machine, inner))
+                    folders.push_back(std::move(folder));
+            }
+        for (std::string& interface : allInterfaces(machine, folders))
+            found.interfaces.push_back(std::move(interface));
+    }
+    return found;
+} catch (const Unreadable&) {
+    throw AdapterError("What is on card " + card + " cannot be read in " + kDevices +
+                       "; this process may have too many files open.");
 }
 
 InterfaceState readInterfaceState(Machine& machine, const PciFunction& function) {
     InterfaceState state;
     for (auto name = function.interfaces.rbegin(); name != function.interfaces.rend(); ++name) {
         const std::string folder = kInterfaces + *name;
-        readMac(machine.readFile(folder + "/address").value_or(""), state.mac);
+        // A bond gives its slaves an address that they have in common.
+        const auto own = machine.readFile(folder + "/bonding_slave/perm_hwaddr");
+        readMac(own ? *own : machine.readFile(folder + "/address").value_or(""), state.mac);
         // Where nothing is plugged in, the kernel says -1, or nothing.
         const auto megabits =
             utils::parseNumber<std::uint32_t>(machine.readFile(folder + "/speed").value_or(""));

@@ -15,7 +15,7 @@
 #include "Utils/StringArray.h"
 
 /// The Ethernet adapters of a machine as sysfs shows them: PCI functions of class 0x0200. Any thread may
-/// call; nothing here waits for a device or throws anything but std::bad_alloc.
+/// call; nothing here waits for a device.
 namespace ma::devlink {
 
 /// One PCI function with a network device on it.
@@ -30,8 +30,19 @@ struct PciFunction {
 };
 
 /// All functions by ascending address. Left out are virtual functions, which have no flash of their own, and
-/// those whose interfaces were all given to another network namespace.
-QUENX_EXPORT std::vector<PciFunction> findPciFunctions(Machine& machine);
+/// those whose interfaces were all given to another network namespace. Nothing where they cannot be read.
+QUENX_EXPORT std::optional<std::vector<PciFunction>> findPciFunctions(Machine& machine);
+
+/// What stands and falls with the functions of a card.
+struct CardFunctions {
+    utils::StringArray functions = {};  ///< of the card's place on the bus, those in other namespaces, too
+    utils::StringArray interfaces =
+        {};  ///< their own, and those that are of, or stand for, virtual functions
+};
+/// @param addresses  further functions that are known to be on the card
+/// @throws AdapterError where that cannot be read
+QUENX_EXPORT CardFunctions readCard(Machine& machine, const std::string& card,
+                                    const utils::StringArray& addresses);
 
 /// What the interfaces of a function tell: nothing where it has none.
 struct InterfaceState {

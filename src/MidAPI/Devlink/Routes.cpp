@@ -37,12 +37,14 @@ bool leadsOut(const std::optional<std::uint32_t>& flags) {
 }  // namespace
 
 Routes::Routes(Machine& machine) {
-    read(machine.readFile("/proc/net/route").value_or(""), readV4);
-    read(machine.readFile("/proc/net/ipv6_route").value_or(""), readV6);
+    // The process's own are there where a service sees no more of procfs than that.
+    read(machine.readFile("/proc/self/net/route"), readV4);
+    read(machine.readFile("/proc/self/net/ipv6_route"), readV6);
 }
 
-void Routes::read(const std::string& text, bool (*readLine)(const std::string&, Route&)) {
-    for (const std::string& line : utils::split(text, '\n'))
+void Routes::read(const std::optional<std::string>& text, bool (*readLine)(const std::string&, Route&)) {
+    m_areKnown = m_areKnown || text;
+    for (const std::string& line : utils::split(text.value_or(""), '\n'))
         if (Route route; readLine(line, route)) m_routes.push_back(std::move(route));
 }
 

@@ -3,6 +3,7 @@
 
 #include <array>
 #include <cstdint>
+#include <optional>
 #include <string>
 #include <vector>
 
@@ -18,6 +19,9 @@ class Machine;
 class QUENX_EXPORT Routes {
   public:
     explicit Routes(Machine& machine);
+
+    /// False where neither list can be read, so that nobody knows what goes where.
+    bool areKnown() const { return m_areKnown; }
 
     /// The interfaces of the default routes in force: at most one of each protocol.
     utils::StringArray defaultInterfaces() const;
@@ -42,10 +46,11 @@ class QUENX_EXPORT Routes {
 
     static bool readV4(const std::string& line, Route& route);
     static bool readV6(const std::string& line, Route& route);
-    void read(const std::string& text, bool (*readLine)(const std::string&, Route&));
+    void read(const std::optional<std::string>& text, bool (*readLine)(const std::string&, Route&));
     std::string best(bool isV4, const Address& address, unsigned longest) const;
 
     std::vector<Route> m_routes;
+    bool m_areKnown = false;
 };
 
 }  // namespace ma::devlink

@@ -38,7 +38,7 @@ std::string freshName(std::string_view card) {
 
 /// What a process has left that was killed in a flash. The kernel has read it long since.
 void sweep(Machine& machine, const std::string& folder, std::string_view card) {
-    for (const std::string& name : machine.listFolder(folder))
+    for (const std::string& name : machine.listFolder(folder).value_or(utils::StringArray()))
         if (name.starts_with(std::string(card) + kSeparator)) machine.removeFile(folder + '/' + name);
 }
 
@@ -54,7 +54,7 @@ utils::StringArray firmwareFolders(Machine& machine) {
     utils::StringArray folders;
     const std::string chosen = machine.readFile("/sys/module/firmware_class/parameters/path").value_or("");
     if (!chosen.empty()) folders.push_back(chosen);
-    const std::string release = machine.readFile("/proc/sys/kernel/osrelease").value_or("");
+    const std::string release = machine.kernelRelease();
     for (const std::string folder : {"/lib/firmware/updates", "/lib/firmware"}) {
         if (!release.empty()) folders.push_back(folder + '/' + release);
         folders.push_back(folder);
@@ -87,13 +87,17 @@ StagedImage::StagedImage(Machine& machine, const std::string& folder, std::strin
                          std::span<const std::uint8_t> image)
     : m_machine(machine), m_name(freshName(card)), m_path(folder + '/' + m_name) {
     const std::string own = folder + '/' + kOwnFolder;
-    machine.makeFolder(own);
-    sweep(machine, own, card);
-    const os::Descriptor file = machine.createFile(m_path);
     try {
+        machine.makeFolder(own);
+        sweep(machine, own, card);
+        const os::Descriptor file = machine.createFile(m_path);
         machine.writeFile(file, image);
         machine.syncFile(file);
         machine.syncFolder(own);
+    } catch (const std::system_error& error) {
+        remove();
+        // Which medium is full, or read-only, is what a user has to know.
+        throw std::system_error(error.code(), "the image cannot be staged in " + own);
     } catch (...) {
         remove();
         throw;

@@ -31,7 +31,8 @@ class QUENX_EXPORT StagedImage {
     /// card, so whoever calls holds the card's lock.
     /// @param folder  what chooseFirmwareFolder() gave
     /// @param card    a name of the card, in letters, digits, dots, colons and underscores
-    /// @throws std::system_error saying what could not be done, and why; nothing is left then
+    /// @throws std::system_error naming the folder, and why; nothing is left then
+    /// @throws os::ForeignFile where the folder in it is another user's
     StagedImage(Machine& machine, const std::string& folder, std::string_view card,
                 std::span<const std::uint8_t> image);
     StagedImage(const StagedImage&) = delete;

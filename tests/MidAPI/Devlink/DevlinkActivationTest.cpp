@@ -21,13 +21,14 @@ class DevlinkActivationTest : public ::testing::Test {
         device().offersActivation = true;
         device().stored["fw"] = "1.3.0";
         putLink(true);
+        m_bench.kernel->put("/proc/self/net/route", "");
     }
     test::FakeDevice& device() const { return m_bench.device(); }
     void putLink(bool isUp) const {
         m_bench.kernel->put("/sys/class/net/enp5s0f0/carrier", isUp ? "1" : "0");
     }
     void putDefaultRoute() const {
-        m_bench.kernel->put("/proc/net/route", "enp5s0f0 00000000 00000000 0003 0 0 0 00000000 0 0 0");
+        m_bench.kernel->put("/proc/self/net/route", "enp5s0f0 00000000 00000000 0003 0 0 0 00000000 0 0 0");
     }
     ma::Activation activate(const ma::ActivationRequest& request = {}) const {
         return ma::activate(m_bench.first, request);
@@ -57,11 +58,22 @@ TEST_F(DevlinkActivationTest, RefusesToCutTheMachineOffUnlessTold) {
     const ma::CardUse use = ma::getCardUse(m_bench.second, "");
     EXPECT_THAT(use.functions, ElementsAre(m_bench.first, m_bench.second));
     EXPECT_THAT(use.interfaces, ElementsAre("enp5s0f0", "enp5s0f1"));
+    const std::string card = "/sys/bus/pci/devices/0000:05:00.";
+    m_bench.kernel->putFolder(card + "1/virtfn3/net/vf3");
+    m_bench.kernel->putFolder(card + "1/net/rep3");
+    m_bench.kernel->put("/sys/class/net/rep3/phys_port_name", "pf1vf3");
+    m_bench.kernel->add("0000:05:00.2");
+    m_bench.kernel->putFolder(card + "2/net");  // its interface is in another namespace
+    const ma::CardUse more = ma::getCardUse(m_bench.first, "");
+    EXPECT_THAT(more.functions, ElementsAre(m_bench.first, m_bench.second, "0000:05:00.2"));
+    EXPECT_THAT(more.interfaces, ElementsAre("enp5s0f0", "enp5s0f1", "rep3", "vf3"));
     // The other function is reset, too.
     const ma::Activation refused = ma::activate(m_bench.second, {});
     EXPECT_EQ(ma::Activation::WouldDisrupt, refused.status);
     EXPECT_EQ("the default route goes through enp5s0f0", refused.text);
     EXPECT_EQ("1.2.3", device().running["fw"]);
+    m_bench.kernel->drop("/proc/self/net");
+    EXPECT_EQ("the routes cannot be read", activate().text);
     EXPECT_EQ(ma::Activation::Done, activate({.mayDisrupt = true}).status);
     m_bench.kernel->hasDevlink = false;
     EXPECT_EQ("this kernel has no devlink", activate().text) << "and so would cut nothing off";
@@ -72,6 +84,47 @@ TEST_F(DevlinkActivationTest, TellsWhatHasNotComeBack) {
     const ma::Activation activation = activate();
     EXPECT_EQ(ma::Activation::NotBack, activation.status);
     EXPECT_EQ("enp5s0f0 has no link", activation.text);
+}
+
+TEST_F(DevlinkActivationTest, SaysOnlyWhatTheVersionsProve) {
+    struct Case {
+        const char* what;
+        bool isAcknowledged;
+        int error;
+        std::function<void(test::FakeDevice&)> during;
+        ma::Activation::Status status;
+        std::string text;
+    };
+    using enum ma::Activation::Status;
+    const auto nothing = [](test::FakeDevice&) {};
+    const auto activated = [](test::FakeDevice& device) { device.running = device.stored; };
+    const auto unreadable = [](test::FakeDevice& device) { device.infoError = EIO; };
+    const auto silent = [](test::FakeDevice& device) { device.running.clear(); };
+    const std::vector<Case> cases = {
+        {"acknowledged without effect", true, 0, [](auto& device) { device.activates = false; }, StillPending,
+         "fw 1.2.3 runs (1.3.0 is in the flash)"},
+        {"acknowledged, then mute", true, 0, unreadable, Unknown, "cannot be read: Input/output error"},
+        {"acknowledged, tells nothing", true, 0, [](auto& device) { device.stored.clear(); }, Done,
+         "the driver does not tell which firmware runs"},
+        {"lost, done", false, 0, nothing, Done, ""},
+        {"lost, not done", false, EIO, nothing, Failed, "answer did not come; fw 1.2.3 runs"},
+        {"lost, mute", false, EIO, unreadable, Unknown, "cannot be read: Input/output error"},
+        {"failed half-way, done", true, EIO, activated, NotBack, "Input/output error"},
+        {"failed half-way, mute", true, EIO, unreadable, Unknown, "Input/output error; which firmware"},
+        {"failed half-way, tells nothing", true, EIO, silent, Unknown, "does not tell which firmware runs"},
+    };
+    for (const Case& each : cases) {
+        const test::DevlinkBench bench;
+        bench.kernel->put("/proc/self/net/route", "");
+        bench.device().offersActivation = true;
+        bench.device().stored["fw"] = "1.3.0";
+        bench.device().isAcknowledged = each.isAcknowledged;
+        bench.device().activationError = each.error;
+        bench.device().duringReset = [&] { each.during(bench.device()); };
+        const ma::Activation activation = ma::activate(bench.first, {});
+        EXPECT_EQ(each.status, activation.status) << each.what << ": " << activation.text;
+        EXPECT_THAT(activation.text, HasSubstr(each.text)) << each.what;
+    }
 }
 
 TEST_F(DevlinkActivationTest, TellsWhyNothingWasActivated) {

@@ -50,7 +50,7 @@ class DevlinkBench {
         return status == 0 ? write() : WriteResult{.text = "status " + std::to_string(status)};
     }
     /// The files that were staged, and are still there.
-    utils::StringArray staged() const { return kernel->listFolder("/lib/firmware/quenx"); }
+    utils::StringArray staged() const { return kernel->listFolder("/lib/firmware/quenx").value(); }
 
   private:
     std::shared_ptr<ma::Backend> m_previous;

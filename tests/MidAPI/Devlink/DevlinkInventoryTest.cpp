@@ -33,6 +33,7 @@ TEST(DevlinkInventoryTest, TellsWhatKernelAndDriverTell) {
     };
     putState("enp5s0f0", "52:54:00:12:34:5f", "25000", "0");
     putState("enp5s0f0x", "52:54:00:12:34:60", "-1", "1");
+    bench.kernel->put("/sys/class/net/enp5s0f0/bonding_slave/perm_hwaddr", "52:54:00:12:34:5e");
     EXPECT_THAT(ma::enumerateAdapters(), ElementsAre(bench.first, bench.second));
     EXPECT_EQ((utils::PCIAddr{5, 0, 1, false, bench.second}), ma::getPCIAddress(bench.second));
     const ma::AdapterInfo info = ma::getAdapterInfo(bench.first);
@@ -40,7 +41,7 @@ TEST(DevlinkInventoryTest, TellsWhatKernelAndDriverTell) {
     EXPECT_EQ("fake", info.driver);
     EXPECT_EQ("AB12", info.serialNumber);
     EXPECT_EQ("CD34", info.boardSerialNumber);
-    EXPECT_THAT(info.permanentMac, ElementsAre(0x52, 0x54, 0, 0x12, 0x34, 0x5f)) << "the first one's";
+    EXPECT_THAT(info.permanentMac, ElementsAre(0x52, 0x54, 0, 0x12, 0x34, 0x5e)) << "the first one's own";
     EXPECT_EQ(25'000'000'000U, info.speed);
     EXPECT_TRUE(info.linkUp) << "of either";
     EXPECT_THAT(info.interfaces, ElementsAre("enp5s0f0", "enp5s0f0x"));
@@ -64,6 +65,8 @@ TEST(DevlinkInventoryTest, TellsWhatKernelAndDriverTell) {
 
 TEST(DevlinkInventoryTest, AsksADeviceOnceUntilItChanges) {
     const test::DevlinkBench bench;
+    EXPECT_THAT(ma::describeSearch(), testing::EndsWith("Not asked yet: 0000:05:00.0, 0000:05:00.1."));
+    EXPECT_EQ(0, bench.kernel->requests) << "a service that starts only lists names";
     EXPECT_EQ("1.2.3", runningVersion(bench.first));
     const int asked = bench.kernel->requests;
     EXPECT_TRUE(ma::getCanBeUpdated(bench.first));
@@ -71,10 +74,17 @@ TEST(DevlinkInventoryTest, AsksADeviceOnceUntilItChanges) {
     EXPECT_EQ(asked, bench.kernel->requests);
 
     bench.device().running["fw"] = "1.3.0";
-    bench.kernel->notify(DEVLINK_CMD_NEW, bench.second);
-    EXPECT_EQ("1.2.3", runningVersion(bench.first)) << "told of another one";
+    bench.kernel->notify(DEVLINK_CMD_NEW, "0000:06:00.0");
+    EXPECT_EQ("1.2.3", runningVersion(bench.first)) << "told of another card";
+    bench.kernel->notify(DEVLINK_CMD_PORT_DEL, bench.second);
+    EXPECT_EQ("1.3.0", runningVersion(bench.first)) << "told of the same card";
+    bench.device().infoError = EIO;
     bench.kernel->notify(DEVLINK_CMD_NEW, bench.first);
-    EXPECT_EQ("1.3.0", runningVersion(bench.first));
+    std::vector<utils::FirmwareVersionInfo> components;
+    EXPECT_THROW(ma::getAdapterFirmwareVersion(bench.first, components), ma::AdapterError);
+    EXPECT_THROW(ma::getAdapterInfo(bench.first), ma::AdapterError);
+    bench.device().infoError = 0;
+    EXPECT_EQ("1.3.0", runningVersion(bench.first)) << "a failure is not kept";
     const test::FakeDevice gone = bench.device();
     bench.kernel->devices.erase(bench.first);
     bench.kernel->notify(DEVLINK_CMD_DEL, bench.first);
@@ -91,9 +101,16 @@ TEST(DevlinkInventoryTest, AsksADeviceOnceUntilItChanges) {
 
     bench.kernel->add("0000:06:00.0");
     EXPECT_TRUE(ma::getCanBeUpdated("0000:06:00.0")) << "plugged in";
+    for (const char* folder : {"", "/0000:06:00.0", "/0000:05:00.0/net"}) {
+        bench.kernel->unreadable = "/sys/bus/pci/devices" + std::string(*folder == 0 ? "/" : folder);
+        EXPECT_EQ(3U, ma::enumerateAdapters().size()) << "not read is not empty: " << folder;
+    }
+    bench.kernel->unreadable.clear();
     bench.kernel->drop("/sys/bus/pci/devices/0000:06:00.0");
     EXPECT_EQ(2U, ma::enumerateAdapters().size()) << "pulled out";
     EXPECT_FALSE(ma::getCanBeUpdated("0000:06:00.0"));
+    EXPECT_EQ(6, ma::getPCIAddress("0000:06:00.0").bus) << "where it was";
+    EXPECT_THROW(ma::getPCIAddress("0000:09:00.0"), ma::AdapterError);
 }
 
 /// All that reads, which must not ask a device that is being flashed.
@@ -133,6 +150,13 @@ TEST(DevlinkInventoryTest, NeverAsksADeviceThatIsBeingFlashed) {
                     testing::HasSubstr(bench.first + " (fake) is being written to by this process ("));
         EXPECT_EQ(ma::PrepareStatus::UnspecifiedError, bench.prepare());
     }
+    EXPECT_TRUE(ma::getCanBeUpdated(bench.first));
+
+    // Not even a lock that others could exchange ends a question.
+    bench.restart();
+    bench.kernel->drop("/var/lib/quenx/locks/0000:05:00.lock");
+    bench.kernel->put("/var/lib/quenx/locks/0000:05:00.lock", "1");
+    bench.kernel->foreignLock = true;
     EXPECT_TRUE(ma::getCanBeUpdated(bench.first));
 }
 

@@ -225,6 +225,7 @@ void FakeKernel::handle(int socket, const Request& request) {
 
 void FakeKernel::tellInfo(int socket, const Request& request, const FakeDevice& device) {
     if (!device.hasInfo) return acknowledge(socket, request, EOPNOTSUPP);
+    if (device.infoError != 0) return acknowledge(socket, request, device.infoError);
     Writer content;
     content.text(DEVLINK_ATTR_INFO_DRIVER_NAME, device.driver);
     if (!device.serial.empty()) content.text(DEVLINK_ATTR_INFO_SERIAL_NUMBER, device.serial);
@@ -270,8 +271,8 @@ void FakeKernel::reset(int socket, const Request& request, FakeDevice& device) {
         return acknowledge(socket, request, EOPNOTSUPP,
                            "Requested reload action is not supported by the driver");
     if (device.duringReset) device.duringReset();
-    if (device.activationError == 0) device.running = device.stored;
-    acknowledge(socket, request, device.activationError);
+    if (device.activationError == 0 && device.activates) device.running = device.stored;
+    if (device.isAcknowledged) acknowledge(socket, request, device.activationError);
 }
 
 // The order of the refusals is the kernel's.

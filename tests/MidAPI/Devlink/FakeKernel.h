@@ -11,6 +11,7 @@
 
 #include "MidAPI/Devlink/Machine.h"
 #include "Support/TempFolder.h"
+#include "Utils/Os/Linux/OwnFiles.h"
 
 namespace test {
 
@@ -21,6 +22,7 @@ struct FakeDevice {
     std::string driver = "fake";
     bool hasFlash = true;
     bool hasInfo = true;
+    int infoError = 0;  ///< how the driver ends a question for it, errno value
     std::string serial;
     std::string boardSerial;
     std::map<std::string, std::string> fixed{};
@@ -44,6 +46,7 @@ struct FakeDevice {
 
     bool offersActivation = false;
     int activationError = 0;  ///< how the driver ends a reset, errno value
+    bool activates = true;    ///< a reset that does not end so brings the new firmware to run
     std::function<void()> duringReset;
 };
 
@@ -65,8 +68,10 @@ class FakeKernel : public ma::devlink::LinuxMachine {
     std::string in(const std::string& path) const { return m_root.path() + path; }
 
     std::set<std::string> readOnly;             ///< folders
+    std::string unreadable;                     ///< a folder that is there
     std::map<std::string, int> failures;        ///< operation and the errno value that it fails with
     std::map<std::string, FakeDevice> devices;  ///< by address
+    bool foreignLock = false;                   ///< the locks are another user's
     bool hasDevlink = true;
     bool isPermitted = true;
     std::function<void(const std::string&)> reading;  ///< called before a file is read
@@ -85,9 +90,10 @@ class FakeKernel : public ma::devlink::LinuxMachine {
     std::optional<std::string> readLink(const std::string& path) override {
         return LinuxMachine::readLink(in(path));
     }
-    utils::StringArray listFolder(const std::string& path) override {
-        return LinuxMachine::listFolder(in(path));
+    std::optional<utils::StringArray> listFolder(const std::string& path) override {
+        return path == unreadable ? std::nullopt : LinuxMachine::listFolder(in(path));
     }
+    std::string kernelRelease() override { return "6.1.0"; }
     bool folderExists(const std::string& path) override { return LinuxMachine::folderExists(in(path)); }
     bool folderIsWritable(const std::string& path) override {
         return folderExists(path) && !readOnly.contains(path);
@@ -105,6 +111,7 @@ class FakeKernel : public ma::devlink::LinuxMachine {
     void syncFolder(const std::string&) override { may("syncFolder"); }
     void removeFile(const std::string& path) override { LinuxMachine::removeFile(may("removeFile", path)); }
     std::unique_ptr<os::FileLock> lock(const std::string& path, std::chrono::milliseconds) override {
+        if (foreignLock) throw os::ForeignFile(path, 12, "cannot lock");
         return LinuxMachine::lock(may("lock", path), std::chrono::milliseconds(0));
     }
 

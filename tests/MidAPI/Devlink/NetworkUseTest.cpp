@@ -47,8 +47,8 @@ class NetworkUseTest : public ::testing::Test {
     ma::CardUse use(const Names& interfaces, const std::string& caller = "") {
         ma::CardUse found;
         found.interfaces = interfaces;
-        m_machine.put("/proc/net/route", m_routesV4);
-        m_machine.put("/proc/net/ipv6_route", m_routesV6);
+        m_machine.put("/proc/self/net/route", m_routesV4);
+        m_machine.put("/proc/self/net/ipv6_route", m_routesV6);
         ma::devlink::findNetworkUse(m_machine, caller, found);
         return found;
     }

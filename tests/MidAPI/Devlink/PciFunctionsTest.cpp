@@ -36,7 +36,8 @@ TEST(PciFunctionsTest, FindsTheEthernetFunctionsAndTheirInterfaces) {
     }
 
     std::string found;
-    for (const PciFunction& function : findPciFunctions(machine))
+    const auto functions = findPciFunctions(machine).value();
+    for (const PciFunction& function : functions)
         found += function.address + ' ' + function.card() + ' ' + function.driver + " [" +
                  utils::joined(function.interfaces) + "]\n";
     EXPECT_EQ(
@@ -45,7 +46,7 @@ TEST(PciFunctionsTest, FindsTheEthernetFunctionsAndTheirInterfaces) {
         "0000:05:00.1 0000:05:00 fake [enp5s0f1]\n"
         "10000:01:00.0 10000:01:00  []\n",
         found);
-    const ma::PciIds ids = findPciFunctions(machine).at(0).ids;
+    const ma::PciIds ids = functions.at(0).ids;
     EXPECT_TRUE(ids.vendor == 0x1af4 && ids.device == 0x1041 && ids.subsystemVendor == 0x1af4 &&
                 ids.subsystemDevice == 0x1100);
 }
