@@ -58,6 +58,7 @@ class FakeService : public core::CimRequests {
     bool answersTheCall = true;
     bool hasMemory = true;
     std::string jobNamespace;
+    bool isSilent = false;   ///< the adapter does not answer
     bool isReadable = true;  ///< what is installed, after the job
     std::string resetNeeded = "None";
     std::string updateState;
@@ -69,6 +70,7 @@ class FakeService : public core::CimRequests {
         if (className != "Quenx_EthernetPort") return {};
         return {{CimPath("Quenx_EthernetPort.DeviceID=\"eth0\""),
                  {{"Name", CimValue::of(CimType::String, std::string("eth0")), false, {}},
+                  number("EnabledState", isSilent ? 0 : 2),
                   texts("OtherIdentifyingInfo", {"1af4:1041", resetNeeded, updateState}),
                   texts("IdentifyingDescriptions",
                         {"PCI Vendor and Device ID", "Reset Needed", "Update State"})}}};
@@ -165,6 +167,12 @@ class InstallVerbTest : public ::testing::Test {
     bool m_isInterrupted = false;
     bool m_mayDisrupt = false;
 };
+
+ExitStatus showPending(cli::Context& context, const cli::VerbOptions&) {
+    cli::VerbOptions pending;
+    pending.pendingOnly = true;
+    return cli::showAdapters(context, pending);
+}
 
 class CardVerbTest : public InstallVerbTest {
   protected:
@@ -308,16 +316,18 @@ TEST_F(CardVerbTest, TellsOfTheCardBeforeAndOfTheResetAfterAnUpdate) {
                                "eth0 was updated.\n  IMG_PXE   1 (unchanged)\n  IMG_UEFI  0 (unchanged)\n"
                                "It takes effect after a reset: \"quenxctl activate --target eth0\" does that "
                                "while the machine runs.\n");
-    EXPECT_EQ(run([](cli::Context& context, const cli::VerbOptions&) {
-                  cli::VerbOptions pending;
-                  pending.pendingOnly = true;
-                  return cli::showAdapters(context, pending);
-              }),
-              ExitStatus::ResetPending);
+    EXPECT_EQ(run(showPending), ExitStatus::ResetPending);
     EXPECT_EQ(m_out.str(), "NAME  RESET   FIRMWARE\neth0  reload  IMG_PXE 1, IMG_UEFI 0\n");
     m_service->updateState = "Busy";
     run(cli::showAdapters);
     EXPECT_NE(m_out.str().find("1af4:1041  busy       IMG_PXE 1"), std::string::npos) << m_out.str();
+}
+
+TEST_F(CardVerbTest, NamesAdaptersThatDoNotAnswerAmongThePending) {
+    m_service->isSilent = true;
+    m_service->installed.clear();
+    EXPECT_EQ(run(showPending), ExitStatus::Unknown);
+    EXPECT_TRUE(m_error.str().starts_with("The firmware of eth0 cannot be read. ")) << m_error.str();
 }
 
 TEST(CallerTest, IsWhoLoggedInToAnAncestor) {
@@ -351,7 +361,12 @@ TEST_F(CardVerbTest, ActivatesWhatWaitsAndTellsHowThatEnded) {
         {{WouldDisrupt, "the default route goes through br0"},
          ExitStatus::Failed,
          "would cut the network: the default route goes through br0.\n"},
-        {{Failed, "Input/output error"}, ExitStatus::Failed, "of eth0 failed: Input/output error.\n"},
+        {{Failed, "Input/output error"},
+         ExitStatus::Failed,
+         "failed; the old firmware still runs: Input/output error.\n"},
+        {{StillPending, "fw 1 runs"}, ExitStatus::ResetPending, "does not run yet: fw 1 runs.\nRestart"},
+        {{Unknown, "no answer"}, ExitStatus::Unknown, "is not known: no answer.\n"},
+        {{Done, "the driver does not tell"}, ExitStatus::Done, "eth0 was reset: the driver does not tell.\n"},
         {{NotBack, "enp1s0 has no link"}, ExitStatus::Unknown, "all there again: enp1s0 has no link.\n"},
     };
     for (const auto& [activation, status, said] : table) {

@@ -29,6 +29,12 @@ std::string outcomeText(const ma::Activation& activation) {
             return "done";
         case ma::Activation::WouldDisrupt:
             return "denied: " + activation.text;
+        // An audit is about what was done, not about what came of it.
+        case ma::Activation::NotBack:
+        case ma::Activation::StillPending:
+            return "done: the card was reset, but " + activation.text;
+        case ma::Activation::Unknown:
+            return "unknown: " + activation.text;
         default:
             return "failed: " + activation.text;
     }

@@ -20,6 +20,8 @@ Ending endingOf(const ma::Activation& activation, const std::string& name) {
     const std::string because = activation.text.empty() ? "." : ": " + activation.text + ".";
     switch (activation.status) {
         case ma::Activation::Done:
+            if (!activation.text.empty())
+                return {"activated", {name + " was reset" + because, "", ExitStatus::Done}};
             return {"activated", {name + " runs the firmware in its flash.", "", ExitStatus::Done}};
         case ma::Activation::NotOffered:
             return {"not offered",
@@ -34,11 +36,22 @@ Ending endingOf(const ma::Activation& activation, const std::string& name) {
                     {name + " was reset, but is not all there again" + because,
                      "Look at \"ip link\" and the kernel's log; a restart of the machine brings it back.",
                      ExitStatus::Unknown}};
-        default:
+        case ma::Activation::StillPending:
+            return {"still pending",
+                    {name + " was reset, but its new firmware does not run yet" + because,
+                     "Restart the machine; some adapters need it to be without power for a moment.",
+                     ExitStatus::ResetPending}};
+        case ma::Activation::Unknown:
             return {
-                "failed",
-                {"The activation of " + name + " failed" + because,
-                 "The old firmware still runs, if nothing else is said. The kernel's log may have more."}};
+                "unknown",
+                {"Whether " + name + " was reset, and which firmware it runs, is not known" + because,
+                 "\"quenxctl adapters\" and the kernel's log may tell; a restart of the machine brings it "
+                 "back.",
+                 ExitStatus::Unknown}};
+        default:
+            return {"failed",
+                    {"The activation of " + name + " failed; the old firmware still runs" + because,
+                     "The kernel's log may have more."}};
     }
 }
 

@@ -47,6 +47,7 @@ struct Outcome {
     std::optional<JobView> job;                ///< when one was started
     std::vector<std::string> unchecked;        ///< what only the write can show
     std::string resetNeeded;                   ///< by what was written, as the model tells it
+    std::optional<ma::CardUse> card;           ///< looked at before an install in process
     std::vector<Component> before;
     std::vector<Component> after;  ///< as before until something is written; empty if it cannot be read
 };
@@ -67,6 +68,7 @@ void to_json(Json& json, const Outcome& outcome) {
             {"after", outcome.after}};
     if (outcome.returnValue) json["returnValue"] = *outcome.returnValue;
     if (outcome.job) json["job"] = *outcome.job;
+    if (outcome.card) json["card"] = cardJson(*outcome.card);
 }
 
 /// "1 -> 2", "1 (unchanged)", "1.2 -> 1.3 after a reset"
@@ -232,6 +234,7 @@ std::optional<core::MethodResult> start(Context& context, const Candidate& candi
 ExitStatus installUnlessInterrupted(Context& context, const UpdateOptions& options) {
     const Candidate candidate = makeCandidate(context.connection, options);
     Outcome outcome(candidate);
+    if (context.connection.isInProcess) outcome.card = readCard(context.connection, outcome.adapter);
     // Checked here: the service would write the same image again.
     if (!candidate.force && candidate.isAlreadyCurrent()) {
         endAsCurrent(outcome, candidate);
@@ -241,7 +244,7 @@ ExitStatus installUnlessInterrupted(Context& context, const UpdateOptions& optio
     }
     if (!context.json) {
         printUnchecked(context.out, outcome);
-        printCard(context.out, readCard(context.connection, outcome.adapter));
+        if (outcome.card) printCard(context.out, *outcome.card);
     }
     // The last moment to stop: once the service is called, nobody can.
     if (context.following.interrupted()) throw CommandError(ExitStatus::Interrupted, "Interrupted.", "");

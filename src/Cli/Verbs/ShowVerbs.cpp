@@ -76,21 +76,38 @@ ExitStatus showAround(Context& context, const VerbOptions& options, List list, L
     }
 }
 
+std::vector<std::string> silentOnes(const std::vector<Adapter>& adapters) {
+    std::vector<std::string> names;
+    for (const Adapter& adapter : adapters)
+        if (!adapter.answers) names.push_back(adapter.name);
+    return names;
+}
+
+void tellSilentOnes(Context& context, const std::vector<std::string>& names) {
+    if (names.empty()) return;
+    context.error << "The firmware of " << printable(joined(names)) << " cannot be read. "
+                  << adviceForSilence(context.connection) << '\n';
+}
+
 ExitStatus showPending(Context& context, std::vector<Adapter> adapters) {
+    const std::vector<std::string> silent = silentOnes(adapters);
     std::erase_if(adapters, [](const Adapter& adapter) { return !adapter.waitsForReset(); });
-    const ExitStatus status = adapters.empty() ? ExitStatus::Done : ExitStatus::ResetPending;
+    const ExitStatus status = !adapters.empty() ? ExitStatus::ResetPending
+                              : silent.empty()  ? ExitStatus::Done
+                                                : ExitStatus::Unknown;
     if (context.json) {
-        printJson(context.out, {{"adapters", adapters}});
-        return status;
-    }
-    if (adapters.empty()) {
-        context.out << "No adapter waits for a reset.\n";
+        printJson(context.out, {{"adapters", adapters}, {"silent", silent}});
         return status;
     }
     std::vector<std::vector<std::string>> rows = {{"NAME", "RESET", "FIRMWARE"}};
     for (const Adapter& adapter : adapters)
         rows.push_back({adapter.name, adapter.resetNeeded, componentsText(adapter.components)});
-    printTable(context.out, rows);
+    if (!adapters.empty())
+        printTable(context.out, rows);
+    else
+        context.out << (silent.empty() ? "No adapter waits for a reset.\n"
+                                       : "No adapter that answers waits for a reset.\n");
+    tellSilentOnes(context, silent);
     return status;
 }
 
@@ -111,7 +128,6 @@ ExitStatus showAdapters(Context& context, const VerbOptions& options) {
     }
     std::vector<std::vector<std::string>> rows = {
         {"NAME", "BACKEND", "PCI", "IDS", "UPDATABLE", "FIRMWARE", "DESCRIPTION"}};
-    std::vector<std::string> silent;
     for (const Adapter& adapter : adapters) {
         const bool isBusyUnknown = adapter.busy && adapter.components.empty();
         const std::string firmware = !adapter.answers || isBusyUnknown ? "?"
@@ -120,7 +136,6 @@ ExitStatus showAdapters(Context& context, const VerbOptions& options) {
         const std::string updatable = !adapter.updatable ? "no" : adapter.busy ? "busy" : "yes";
         rows.push_back({adapter.name, adapter.backend, adapter.pciAddress, adapter.ids, updatable, firmware,
                         adapter.description});
-        if (!adapter.answers) silent.push_back(adapter.name);
     }
     printTable(context.out, rows);
     // Why that is so is the next question.
@@ -128,9 +143,7 @@ ExitStatus showAdapters(Context& context, const VerbOptions& options) {
         const std::string advice = adviceForNoAdapters(context.connection);
         if (!advice.empty()) context.out << printable(advice) << '\n';
     }
-    if (!silent.empty())
-        context.error << "The firmware of " << printable(joined(silent)) << " cannot be read. "
-                      << adviceForSilence(context.connection) << '\n';
+    tellSilentOnes(context, silentOnes(adapters));
     return ExitStatus::Done;
 }
 
