@@ -24,7 +24,7 @@ struct PCIAddr {
     bool noFunction = false;  ///< true when the address carries no function number
     std::string text;         ///< free text of the adapter API
 
-    /// True when both are ports of one card.
+    /// True when bus and device are equal: both are ports of one card, in one PCI domain.
     bool sameAdapter(const PCIAddr& other) const { return bus == other.bus && device == other.device; }
 
     bool operator==(const PCIAddr& other) const = default;

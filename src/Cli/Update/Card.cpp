@@ -83,7 +83,7 @@ void printCard(std::ostream& out, const ma::CardUse& card) {
 }
 
 ma::Activation activateFirmware(const std::string& adapter, bool mayDisrupt) {
-    const auto activation = ma::activate(adapter, {.mayDisrupt = mayDisrupt, .caller = caller()});
+    auto activation = ma::activate(adapter, {.mayDisrupt = mayDisrupt, .caller = caller()});
     auditOwn("ActivateFirmware", adapter, outcomeText(activation));
     return activation;
 }

@@ -63,7 +63,7 @@ Answer flash(DevlinkConnection& connection, const std::string& address, const st
 std::string describe(const Answer& answer) {
     if (answer.isLost) return "the kernel's answer did not come";
     const auto& [error, text, offset, missingType] = answer.result;
-    const std::string reason = std::generic_category().message(error);
+    std::string reason = std::generic_category().message(error);
     if (error == ENOENT && text == "failed to locate the requested firmware file")
         return text + " (" + reason +
                "). The kernel looks for the file in the machine's own folders: outside a container it finds "

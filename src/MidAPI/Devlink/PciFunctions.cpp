@@ -39,7 +39,7 @@ utils::StringArray interfaceFolders(Machine& machine, const std::string& functio
     utils::StringArray folders;
     if (machine.folderExists(function + "/net")) folders.push_back(function + "/net");
     for (const std::string& name : list(machine, function)) {
-        const std::string inner = function + '/' + name + "/net";
+        const std::string inner = utils::formatStr("%s/%s/net", function.c_str(), name.c_str());
         if (name.starts_with("virtio") && machine.folderExists(inner)) folders.push_back(inner);
     }
     return folders;
@@ -122,12 +122,14 @@ CardFunctions readCard(Machine& machine, const std::string& card, const utils::S
     for (const std::string& address : list(machine, kDevices)) {
         if (!isMeant(address)) continue;
         found.functions.push_back(address);
-        utils::StringArray folders = interfaceFolders(machine, kDevices + address);
-        for (const std::string& name : list(machine, kDevices + address))
+        const std::string folder = kDevices + address;
+        utils::StringArray folders = interfaceFolders(machine, folder);
+        for (const std::string& name : list(machine, folder))
             if (name.starts_with("virtfn")) {
-                const std::string inner = kDevices + address + '/' + name;
-                for (std::string& folder : interfaceFolders(machine, inner))
-                    folders.push_back(std::move(folder));
+                std::string inner = folder + '/';
+                inner += name;
+                for (std::string& each : interfaceFolders(machine, inner))
+                    folders.push_back(std::move(each));
             }
         for (std::string& interface : allInterfaces(machine, folders))
             found.interfaces.push_back(std::move(interface));

@@ -99,6 +99,11 @@ TEST(DevlinkInventoryTest, AsksADeviceOnceUntilItChanges) {
         bench.kernel->notify(DEVLINK_CMD_PORT_NEW, bench.second);
     EXPECT_EQ("1.4.0", runningVersion(bench.first)) << "what was lost may have been about it";
 
+    bench.device().running["fw"] = "1.5.0";
+    EXPECT_EQ("1.4.0", runningVersion(bench.first)) << "nothing was told";
+    EXPECT_EQ(0, bench.prepare());
+    EXPECT_EQ("1.5.0", runningVersion(bench.first)) << "what an image is held against is read anew";
+
     bench.kernel->add("0000:06:00.0");
     EXPECT_TRUE(ma::getCanBeUpdated("0000:06:00.0")) << "plugged in";
     for (const char* folder : {"", "/0000:06:00.0", "/0000:05:00.0/net"}) {
