@@ -67,13 +67,6 @@ test_list() {
     case "$output" in *netdevsim*) return 1 ;; esac
 }
 
-test_check() {
-    flashes="$(read_knob $C flashes)"
-    quenxctl check --target $C "$(image 2.0.0)"
-    same "$(read_knob $C flashes)" "$flashes"
-    no_image_is_left
-}
-
 test_install() {
     running="$(version $C running fw)"
     image 2.1.0
