@@ -2,7 +2,6 @@
 #include "MidAPI/Backends.h"
 
 #include <gtest/gtest.h>
-#include <unistd.h>
 
 #include <cstdlib>
 #include <map>
@@ -42,12 +41,6 @@ class BackendsTest : public testing::Test {
     const std::shared_ptr<ma::Backend> m_backend = ma::setBackend(nullptr);
     Values m_before;
 };
-
-bool installsOnEth0() {
-    const test::PreparedImage prepared =
-        test::prepareImage("eth0", test::madeRom({{utils::FirmwareType::PXE, 9}}));
-    return test::writeImage("eth0", prepared.image).done;
-}
 
 /// What is in use after the choice: what it says of its search, or the error.
 std::string searchOf(const ma::BackendChoice& choice) try {
@@ -106,25 +99,10 @@ TEST_F(BackendsTest, StayUntilTheNextOneIsThere) {
     EXPECT_THROW(ma::selectBackend({.description = adapters.folder() / "none.toml"}), ma::AdapterError);
     EXPECT_EQ(5U, ma::enumerateAdapters().size());
     EXPECT_EQ("simulator", ma::getAdapterInfo("eth0").backend);
-    EXPECT_TRUE(installsOnEth0());
+    const auto prepared = test::prepareImage("eth0", test::madeRom({{utils::FirmwareType::PXE, 9}}));
+    EXPECT_TRUE(test::writeImage("eth0", prepared.image).done);
     EXPECT_EQ("IMG_PXE 9, IMG_UEFI 0", test::describeRom(adapters->flashContent("eth0")))
         << "the state is that of the variable";
-}
-
-TEST_F(BackendsTest, AnswersUntilTheProcessHasEnded) {
-    // As a provider that is still loaded then: its destructor waits for the flash that runs.
-    const auto provider = [] {
-        if (ma::enumerateAdapters().size() != 5 || !installsOnEth0()) ::_exit(1);
-    };
-    const test::TempFolder folder;
-    const std::string description = folder.write("adapters.toml", test::kTestAdapters);
-    EXPECT_EXIT(
-        {
-            std::atexit(provider);
-            ma::selectBackend({.description = description, .state = folder / "state"});
-            std::exit(0);
-        },
-        testing::ExitedWithCode(0), "");
 }
 
 }  // namespace

@@ -13,8 +13,7 @@ namespace {
 using ::testing::ElementsAre;
 using ::testing::HasSubstr;
 
-/// A card that has been updated and offers activation, whose first interface has a link and the default
-/// route.
+/// A card that has been updated and offers activation, whose first interface has a link.
 class DevlinkActivationTest : public ::testing::Test {
   protected:
     DevlinkActivationTest() {
@@ -26,9 +25,6 @@ class DevlinkActivationTest : public ::testing::Test {
     test::FakeDevice& device() const { return m_bench.device(); }
     void putLink(bool isUp) const {
         m_bench.kernel->put("/sys/class/net/enp5s0f0/carrier", isUp ? "1" : "0");
-    }
-    void putDefaultRoute() const {
-        m_bench.kernel->put("/proc/self/net/route", "enp5s0f0 00000000 00000000 0003 0 0 0 00000000 0 0 0");
     }
     ma::Activation activate(const ma::ActivationRequest& request = {}) const {
         return ma::activate(m_bench.first, request);
@@ -54,7 +50,7 @@ TEST_F(DevlinkActivationTest, ResetsTheCardAndReadsItAnew) {
 }
 
 TEST_F(DevlinkActivationTest, RefusesToCutTheMachineOffUnlessTold) {
-    putDefaultRoute();
+    m_bench.kernel->put("/proc/self/net/route", "enp5s0f0 00000000 00000000 0003 0 0 0 00000000 0 0 0");
     const ma::CardUse use = ma::getCardUse(m_bench.second, "");
     EXPECT_THAT(use.functions, ElementsAre(m_bench.first, m_bench.second));
     EXPECT_THAT(use.interfaces, ElementsAre("enp5s0f0", "enp5s0f1"));
