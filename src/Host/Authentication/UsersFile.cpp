@@ -89,13 +89,16 @@ void checkMode(const std::string& path) {
     }
 }
 
+[[noreturn]] void failForHash(const std::string& path, const std::string& user) {
+    fail(path, "this system cannot check the password hash of " + user +
+                   ". Set a password with: quenx-cimd passwd --users " + path + " " + user);
+}
+
 /// What cannot be meant, and would keep out who should come in.
 void requireUsable(const std::string& path, const UserEntries& users) {
     for (const auto& [name, entry] : users) {
         const int method = ::crypt_checksalt(entry.hash.c_str());
-        if (method == CRYPT_SALT_INVALID || method == CRYPT_SALT_METHOD_DISABLED)
-            fail(path, "this system cannot check the password hash of " + name +
-                           ". Set a password with: quenx-cimd passwd --users " + path + " " + name);
+        if (method == CRYPT_SALT_INVALID || method == CRYPT_SALT_METHOD_DISABLED) failForHash(path, name);
     }
     if (!users.empty()) return;
     // One that the last user was deleted from still has its first line.

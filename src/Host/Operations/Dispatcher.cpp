@@ -108,8 +108,8 @@ void Dispatcher::audit(const cimxml::Request& request, const Caller& caller,
     const auto* method = std::get_if<cimxml::MethodCall>(&request.call);
     event.target = method != nullptr ? method->object.toString()
                                      : targetOf(std::get<cimxml::IntrinsicCall>(request.call));
-    static const std::vector<core::Argument> none;
-    const std::vector<core::Argument>& arguments = method != nullptr ? method->arguments : none;
+    static const std::vector<core::Argument> kNone;
+    const std::vector<core::Argument>& arguments = method != nullptr ? method->arguments : kNone;
     const auto* error = std::get_if<ErrorResult>(&response.content);
     if (error != nullptr && error->status == CimStatus::AccessDenied) {
         m_trail->refused(event, arguments);

@@ -93,7 +93,7 @@ MHD_Response* makeResponse(HttpAnswer& answer) {
     std::unique_ptr<Body> body(new Body{std::move(answer.charge), std::move(answer.body)});
     MHD_Response* response = ::MHD_create_response_from_buffer_with_free_callback_cls(
         body->text.size(), body->text.data(), freeBody, body.get());
-    if (response != nullptr) body.release();
+    if (response != nullptr) static_cast<void>(body.release());
     return response;
 }
 

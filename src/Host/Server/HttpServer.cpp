@@ -52,7 +52,7 @@ int socketOf(MHD_Connection* connection) {
 void logLibrary(void*, const char* format, va_list arguments) __attribute__((format(printf, 2, 0)));
 void logLibrary(void*, const char* format, va_list arguments) {
     char line[512];
-    std::vsnprintf(line, sizeof line, format, arguments);
+    if (std::vsnprintf(line, sizeof line, format, arguments) < 0) return;
     QUENX_DEBUG("http: %s", utils::escapeForFormat(line).c_str());
 }
 
@@ -136,7 +136,7 @@ MHD_Daemon* HttpServer::library(bool tls) {
         {MHD_OPTION_NOTIFY_COMPLETED, reinterpret_cast<intptr_t>(&Callbacks::completed), this},
         {MHD_OPTION_NOTIFY_CONNECTION, reinterpret_cast<intptr_t>(&Callbacks::connection), this},
         // Never reached: the watch admits no more, and at its limit the library locks a mutex for good.
-        {MHD_OPTION_CONNECTION_LIMIT, 2 * ConnectionWatch::mostOf(m_limits), nullptr},
+        {MHD_OPTION_CONNECTION_LIMIT, 2 * static_cast<intptr_t>(ConnectionWatch::mostOf(m_limits)), nullptr},
         {MHD_OPTION_CONNECTION_TIMEOUT, static_cast<intptr_t>(m_limits.idleTime.count()), nullptr},
         {MHD_OPTION_CONNECTION_MEMORY_LIMIT, static_cast<intptr_t>(m_limits.headerBytes), nullptr},
         {MHD_OPTION_STRICT_FOR_CLIENT, 1, nullptr}};

@@ -23,7 +23,7 @@ namespace {
 
 namespace fs = std::filesystem;
 
-constexpr std::time_t kDay = 24 * 60 * 60;
+constexpr std::time_t kDay = std::time_t{24} * 60 * 60;
 constexpr std::time_t kLifetime = 3650 * kDay;
 /// 2025: before there was this program.
 constexpr std::time_t kTooEarly = 1735689600;
