@@ -21,8 +21,7 @@ std::vector<std::uint16_t> classify(const std::vector<inventory::FirmwareCompone
     };
     std::vector<std::uint16_t> result{Firmware};
     if (std::any_of(components.begin(), components.end(), isDriver)) result.push_back(Driver);
-    if (components.empty() || std::any_of(components.begin(), components.end(), isBios))
-        result.push_back(Bios);
+    if (std::any_of(components.begin(), components.end(), isBios)) result.push_back(Bios);
     return result;
 }
 

@@ -63,6 +63,15 @@ TEST_F(FirmwareTest, ComesAndGoesWithItsFile) {
               Rows{"1af4:1041 IMG_PXE 1, IMG_UEFI 0; http://ipxe.org; iPXE"});
 }
 
+TEST_F(FirmwareTest, HasTheKindsOfWhatIsInIt) {
+    std::vector<std::uint8_t> other = test::madeRom({{utils::FirmwareType::PXE, 1}});
+    other.at(other[0x18] + 0x14U) = 1;  // code for Open Firmware, which has no type here
+    other.back() -= 1;                  // the sum stays
+    m_folder.write("a/other.rom", other);
+    m_folder.write("b/both.rom", rom(1));
+    EXPECT_EQ(table("Quenx_SoftwareIdentity", {"Classifications"}), (Rows{"10", "10,2,11"}));
+}
+
 TEST_F(FirmwareTest, IsReadOncePerChangeAndSkippedWithOneLineWhereBroken) {
     std::vector<std::uint8_t> cut = rom(1);
     cut.resize(cut.size() - 512);
