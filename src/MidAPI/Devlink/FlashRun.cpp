@@ -44,7 +44,7 @@ class FlashRun {
 
     /// @param component  empty for the whole device
     void flashOne(const std::string& component) try {
-        const std::string before = storedVersions(askInfo(m_connection, m_address));
+        const ToldInfo before = askInfo(m_connection, m_address);
         // Listening before the request: what is told meanwhile is told once.
         FlashWatch watch(m_machine, m_connection.family(), m_address, [this](const FlashStatus& status) {
             m_progress.report(status);
@@ -77,26 +77,33 @@ class FlashRun {
 
     /// What a failure has left in the flash.
     std::string whatIsLeft() const {
-        const std::string stored = storedVersions(askInfoAnew(m_machine, m_address));
-        return (stored.empty() ? kNotTold : "; the flash holds " + stored) +
+        return whatIsStored(askInfoAnew(m_machine, m_address)) +
                (m_written.empty() ? "" : "; before it " + utils::joined(m_written) + " was written");
     }
 
+    static std::string whatIsStored(const ToldInfo& told) {
+        if (!told.error.empty()) return "; what is in the flash cannot be read: " + told.error;
+        const std::string stored = storedVersions(told);
+        return stored.empty() ? "; the driver does not tell what is in the flash"
+                              : "; the flash holds " + stored;
+    }
+
     /// Nobody has told how the flash ended, but what is stored does, where it has changed.
-    void resolve(const std::string& before) const {
-        const std::string after = storedVersions(askInfoAnew(m_machine, m_address));
-        if (!after.empty() && after != before) {
+    void resolve(const ToldInfo& before) const {
+        const ToldInfo now = askInfoAnew(m_machine, m_address);
+        const std::string after = storedVersions(now);
+        const std::string stored = storedVersions(before);
+        // What was not known before has not changed by being known now.
+        if (!stored.empty() && !after.empty() && after != stored) {
             QUENX_ERROR(
                 "adapter %s: the kernel did not tell how the update ended, but the flash now holds %s",
                 m_address.c_str(), after.c_str());
             return;
         }
-        fail(ETIMEDOUT, "the kernel did not tell how the update ended" +
-                            (after.empty() ? kNotTold : "; the flash holds " + after + ", as before") +
+        fail(ETIMEDOUT, "the kernel did not tell how the update ended" + whatIsStored(now) +
+                            (after.empty() || after != stored ? "" : ", as before") +
                             "; look at the adapter's versions, and update it again");
     }
-
-    inline static const std::string kNotTold = "; the driver does not tell what is in the flash";
 
     Machine& m_machine;
     DevlinkConnection m_connection;

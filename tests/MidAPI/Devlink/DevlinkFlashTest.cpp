@@ -254,6 +254,13 @@ TEST(DevlinkFlashTest, ReadsFromTheFlashWhatALostAcknowledgementWouldHaveTold) {
         EXPECT_THAT(result.text, HasSubstr(each.text));
         EXPECT_EQ(each.done, ma::getFlashImageUpdateProgress(bench.first) == 100);
     }
+    // What was not known before has not changed by being known now.
+    const test::DevlinkBench bench;
+    ASSERT_EQ(0, bench.prepare());
+    bench.device().infoError = EIO;
+    bench.device().isAcknowledged = false;
+    bench.device().duringFlash = [&] { bench.device().infoError = 0; };
+    EXPECT_THAT(bench.write().text, HasSubstr("how the update ended; the flash holds fw 1.3.0; look at"));
 }
 
 TEST(DevlinkFlashTest, FlashesACardFromOnePlaceAtATime) {
