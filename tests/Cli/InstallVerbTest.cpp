@@ -328,6 +328,9 @@ TEST_F(CardVerbTest, NamesAdaptersThatDoNotAnswerAmongThePending) {
     m_service->installed.clear();
     EXPECT_EQ(run(showPending), ExitStatus::Unknown);
     EXPECT_TRUE(m_error.str().starts_with("The firmware of eth0 cannot be read. ")) << m_error.str();
+    m_service->isSilent = false;
+    m_service->updateState = "Busy";
+    EXPECT_EQ(run(showPending), ExitStatus::Unknown);
 }
 
 TEST(CallerTest, IsWhoLoggedInToAnAncestor) {

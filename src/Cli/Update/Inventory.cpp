@@ -162,9 +162,15 @@ std::vector<Component> readComponents(core::CimOperations& operations, const cor
 
 namespace {
 
+/// Unknown to the provider, and not merely not told.
+bool isUnknown(const core::InstanceValue& port) {
+    return port.get<std::uint64_t>("EnabledState") == 0U;
+}
+
 std::string resetNeededOf(const core::InstanceValue& port) {
     const std::string reset = identifyingText(port, "Reset Needed");
-    return reset.empty() ? "none" : utils::lowerCase(reset);
+    if (reset.empty()) return isUnknown(port) ? "unknown" : "none";
+    return utils::lowerCase(reset);
 }
 
 void readMore(Adapter& adapter, const core::InstanceValue& port) {
@@ -187,9 +193,7 @@ std::vector<Adapter> readAdapters(core::CimOperations& operations) {
                             identifyingText(port, "PCI Vendor and Device ID"),
                             !core::sameName(identifyingText(port, "Firmware Update"), "Not Supported"),
                             readComponents(operations, port.path)});
-        // Unknown to the provider, and not merely not told.
-        const bool isUnknown = port.get<std::uint64_t>("EnabledState") == 0U;
-        adapters.back().answers = !isUnknown || !adapters.back().components.empty();
+        adapters.back().answers = !isUnknown(port) || !adapters.back().components.empty();
         readMore(adapters.back(), port);
     }
     return adapters;

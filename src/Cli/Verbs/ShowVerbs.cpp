@@ -76,10 +76,15 @@ ExitStatus showAround(Context& context, const VerbOptions& options, List list, L
     }
 }
 
+/// Nothing of its firmware is known: it does not answer, or answers nobody while it is written to.
+bool isFirmwareUnknown(const Adapter& adapter) {
+    return !adapter.answers || (adapter.busy && adapter.components.empty());
+}
+
 std::vector<std::string> silentOnes(const std::vector<Adapter>& adapters) {
     std::vector<std::string> names;
     for (const Adapter& adapter : adapters)
-        if (!adapter.answers) names.push_back(adapter.name);
+        if (isFirmwareUnknown(adapter)) names.push_back(adapter.name);
     return names;
 }
 
@@ -129,10 +134,9 @@ ExitStatus showAdapters(Context& context, const VerbOptions& options) {
     std::vector<std::vector<std::string>> rows = {
         {"NAME", "BACKEND", "PCI", "IDS", "UPDATABLE", "FIRMWARE", "DESCRIPTION"}};
     for (const Adapter& adapter : adapters) {
-        const bool isBusyUnknown = adapter.busy && adapter.components.empty();
-        const std::string firmware = !adapter.answers || isBusyUnknown ? "?"
-                                     : adapter.components.empty()      ? "-"
-                                                                       : componentsText(adapter.components);
+        const std::string firmware = isFirmwareUnknown(adapter)   ? "?"
+                                     : adapter.components.empty() ? "-"
+                                                                  : componentsText(adapter.components);
         const std::string updatable = !adapter.updatable ? "no" : adapter.busy ? "busy" : "yes";
         rows.push_back({adapter.name, adapter.backend, adapter.pciAddress, adapter.ids, updatable, firmware,
                         adapter.description});
