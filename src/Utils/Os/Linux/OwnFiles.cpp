@@ -6,6 +6,7 @@
 #include <unistd.h>
 
 #include <cerrno>
+#include <filesystem>
 #include <system_error>
 
 #include "Utils/Os/Linux/linux.h"
@@ -39,10 +40,11 @@ int aboveStandard(int descriptor) noexcept {
 void requireSafePlace(const Descriptor& folder, const std::string& path, const std::string& purpose) {
     struct stat status {};
     if (::fstatat(folder.number(), "..", &status, 0) != 0) fail(errno, purpose + " " + path);
-    const std::string place = path + "/..";
+    const std::string place = std::filesystem::path(path).parent_path().string();
     if (status.st_uid != ::geteuid() && status.st_uid != 0) throw ForeignFile(place, status.st_uid, purpose);
     if ((status.st_mode & S_IWOTH) != 0 && (status.st_mode & S_ISVTX) == 0)
-        fail(EPERM, purpose + " " + path + ": everybody may exchange it; run: chmod o-w " + place);
+        throw std::runtime_error(purpose + " " + path + ": everybody may exchange it; run: chmod o-w " +
+                                 place);
 }
 
 }  // namespace

@@ -34,8 +34,8 @@ QUENX_EXPORT bool closeToOthers(int descriptor) noexcept;
 
 /// Closes a folder of this user's to all others: whoever can open a file can also lock it, and so hold up
 /// whoever else wants to. A link is refused, and a folder that is another user's or that another can
-/// exchange, because the one that it lies in is theirs (ForeignFile) or writable for all (std::system_error).
-/// False when there is none.
+/// exchange, because the one that it lies in is theirs (ForeignFile) or writable for all
+/// (std::runtime_error). False when there is none.
 QUENX_EXPORT bool closeFolderToOthers(const std::string& path);
 
 /// Writes all bytes at the file's position.
