@@ -292,7 +292,8 @@ std::string DevlinkBackend::describeSearch() {
                                        : "is being written to by " + known->writer) +
                 ".";
     }
-    if (!others.empty()) text += " Not asked yet: " + utils::joined(others) + ".";
+    if (!others.empty())
+        text += " Asked at the first request whether they can be updated: " + utils::joined(others) + ".";
     return text;
 }
 
