@@ -317,7 +317,7 @@ TEST_F(CardVerbTest, TellsOfTheCardBeforeAndOfTheResetAfterAnUpdate) {
                                "It takes effect after a reset: \"quenxctl activate --target eth0\" does that "
                                "while the machine runs.\n");
     EXPECT_EQ(run(showPending), ExitStatus::ResetPending);
-    EXPECT_EQ(m_out.str(), "NAME  RESET   FIRMWARE\neth0  reload  IMG_PXE 1, IMG_UEFI 0\n");
+    EXPECT_EQ(m_out.str(), "NAME  BACKEND  RESET   FIRMWARE\neth0           reload  IMG_PXE 1, IMG_UEFI 0\n");
     m_service->updateState = "Busy";
     run(cli::showAdapters);
     EXPECT_NE(m_out.str().find("1af4:1041  busy       IMG_PXE 1"), std::string::npos) << m_out.str();

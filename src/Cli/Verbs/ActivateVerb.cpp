@@ -55,14 +55,15 @@ Ending endingOf(const ma::Activation& activation, const std::string& name) {
     }
 }
 
-ExitStatus print(Context& context, const std::string& name, const ma::CardUse& card, const Ending& ending) {
+ExitStatus print(Context& context, const Adapter& adapter, const ma::CardUse& card, const Ending& ending) {
     const Explanation& why = ending.why;
     if (context.json) {
         printJson(context.out, {{"result", ending.result},
                                 {"exitStatus", static_cast<int>(why.status)},
                                 {"message", why.message},
                                 {"advice", why.advice},
-                                {"adapter", name},
+                                {"adapter", adapter.name},
+                                {"backend", adapter.backend},
                                 {"card", cardJson(card)}});
         return why.status;
     }
@@ -76,18 +77,20 @@ ExitStatus print(Context& context, const std::string& name, const ma::CardUse& c
 }  // namespace
 
 ExitStatus activate(Context& context, const VerbOptions& options) {
-    const std::string name = findAdapter(context.connection, options.update.target).name;
+    const Adapter adapter = findAdapter(context.connection, options.update.target);
+    const std::string& name = adapter.name;
+    const std::string label = labelOf(name, adapter.backend);
     const ma::CardUse card = readCard(context.connection, name);
     if (!context.json) printCard(context.out, card);
     if (ma::getAdapterInfo(name).resetNeeded == ma::ResetNeeded::None) {
-        return print(context, name, card,
+        return print(context, adapter, card,
                      {"already current",
-                      {name + " runs the firmware in its flash: nothing waits for a reset.", "",
+                      {label + " runs the firmware in its flash: nothing waits for a reset.", "",
                        ExitStatus::AlreadyCurrent}});
     }
-    const Ending ending = endingOf(activateFirmware(name, options.mayDisrupt), name);
+    const Ending ending = endingOf(activateFirmware(name, options.mayDisrupt), label);
     context.following.over();
-    return print(context, name, card, ending);
+    return print(context, adapter, card, ending);
 }
 
 }  // namespace cli

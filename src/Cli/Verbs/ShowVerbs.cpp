@@ -104,9 +104,10 @@ ExitStatus showPending(Context& context, std::vector<Adapter> adapters) {
         printJson(context.out, {{"adapters", adapters}, {"silent", silent}});
         return status;
     }
-    std::vector<std::vector<std::string>> rows = {{"NAME", "RESET", "FIRMWARE"}};
+    std::vector<std::vector<std::string>> rows = {{"NAME", "BACKEND", "RESET", "FIRMWARE"}};
     for (const Adapter& adapter : adapters)
-        rows.push_back({adapter.name, adapter.resetNeeded, componentsText(adapter.components)});
+        rows.push_back(
+            {adapter.name, adapter.backend, adapter.resetNeeded, componentsText(adapter.components)});
     if (!adapters.empty())
         printTable(context.out, rows);
     else
