@@ -31,7 +31,7 @@ enum PrepareStatus : int {
     ImageTypesDiffer = 4,   ///< other image types than the adapter carries; the output is filled all the same
     ImageNotApplicable = 5,  ///< a requested type is not in the file, or is no component that the driver
                              ///< takes; or nothing in it can be installed
-    UnspecifiedError = 6,  ///< the adapter could not be read, is being written to, or may not be written to
+    UnspecifiedError = 6,    ///< the adapter could not be read, is being written to, or may not be written to
 };
 
 /// What can be said of an image file before it is written.

@@ -24,6 +24,7 @@ class QUENX_EXPORT Backend {
     Backend& operator=(const Backend&) = delete;
     virtual ~Backend();
 
+    virtual std::string name() const;  ///< by which it is chosen; empty for one that cannot be
     virtual utils::StringArray enumerateAdapters() = 0;
     virtual utils::PCIAddr getPCIAddress(const std::string& adapter) = 0;
     virtual bool getCanBeUpdated(const std::string& adapter) = 0;

@@ -45,6 +45,10 @@ AdapterError::~AdapterError() = default;
 
 Backend::~Backend() = default;
 
+std::string Backend::name() const {
+    return {};
+}
+
 std::string Backend::describeSearch() {
     return {};
 }
@@ -100,6 +104,10 @@ std::uint16_t getFlashImageUpdateProgress(std::string adapter) {
 
 bool setBootType(std::string adapter, BootType type) {
     return backend()->setBootType(adapter, type);
+}
+
+std::string backendName() {
+    return backend()->name();
 }
 
 AdapterInfo getAdapterInfo(std::string adapter) {

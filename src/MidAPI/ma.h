@@ -79,6 +79,9 @@ QUENX_EXPORT std::uint16_t getFlashImageUpdateProgress(std::string adapter);
 /// Sets the boot protocol of a port. Returns false when that failed.
 QUENX_EXPORT bool setBootType(std::string adapter, BootType type);
 
+/// The name of the backend that reaches the adapters, as AdapterInfo::backend has it.
+QUENX_EXPORT std::string backendName();
+
 /// Everything else that is known of a port. Throws AdapterError for an unknown name or an unreadable adapter.
 QUENX_EXPORT AdapterInfo getAdapterInfo(std::string adapter);
 

@@ -46,6 +46,7 @@ class QUENX_EXPORT DevlinkBackend : public Backend {
     /// Devlink knows no boot protocols: does nothing, and says so by false.
     bool setBootType(const std::string& adapter, BootType type) override;
     AdapterInfo getAdapterInfo(const std::string& adapter) override;
+    std::string name() const override { return kDevlinkBackend; }
     std::string describeSearch() override;
     std::optional<ImageVerdict> judgeImage(const std::string& adapter, std::span<const std::uint8_t> file,
                                            const std::vector<utils::FirmwareType>& types) override;

@@ -49,6 +49,7 @@ class QUENX_EXPORT Simulator : public Backend {
     std::uint16_t getFlashImageUpdateProgress(const std::string& adapter) override;
     bool setBootType(const std::string& adapter, BootType type) override;
     AdapterInfo getAdapterInfo(const std::string& adapter) override;
+    std::string name() const override { return kSimulatorBackend; }
     std::string describeSearch() override;
 
   private:

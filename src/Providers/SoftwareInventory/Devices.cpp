@@ -17,7 +17,6 @@ void addTold(std::vector<Identification>& rows, const ma::AdapterInfo& info) {
     const auto add = [&rows](std::string description, const std::string& text) {
         if (!text.empty()) rows.push_back({std::move(description), text});
     };
-    add("Adapter Backend", info.backend);
     add("Driver", info.driver);
     add("Serial Number", info.serialNumber);
     add("Board Serial Number", info.boardSerialNumber);
@@ -66,6 +65,9 @@ std::vector<Identification> identify(const std::string& address, const std::opti
             {"PCI Subsystem Vendor and Device ID", ma::formatIds(ids.subsystemVendor, ids.subsystemDevice)});
     }
     rows.push_back({"Firmware Update", updatable ? "Supported" : "Not Supported"});
+    // Also of an adapter that does not answer.
+    const std::string backend = info ? info->backend : ma::backendName();
+    if (!backend.empty()) rows.push_back({"Adapter Backend", backend});
     if (info) addTold(rows, *info);
     return rows;
 }

@@ -71,14 +71,14 @@ TEST_F(PortsTest, ThatDoNotAnswerHideNoOthers) {
         table("Quenx_EthernetPort",
               {"Name", "EnabledState", "HealthState", "OperationalStatus", "OtherIdentifyingInfo",
                "Description", "PermanentAddress", "NetworkAddresses", "Speed"});
-    EXPECT_EQ(ports.at(0), "eth0; 0; 0; 0; 03:00.0,Supported; ; ; ; ");
+    EXPECT_EQ(ports.at(0), "eth0; 0; 0; 0; 03:00.0,Supported,simulator; ; ; ; ");
     EXPECT_EQ(ports.at(1),
               "eth1; 6; 5; 2; 03:00.1,1af4:1041,1af4:1041,Supported,simulator; ; 525400000011; "
               "525400000011; 10000000000");
     const Rows controllers = table("Quenx_PortController", {"Name", "EnabledState", "HealthState",
                                                             "OtherIdentifyingInfo", "Description"});
     EXPECT_EQ(controllers.front(), "03:00; 2; 5; 03:00,1af4:1041,1af4:1041,Supported,simulator; ");
-    EXPECT_EQ(controllers.back(), "06:00; 0; 0; 06:00,Supported; ");
+    EXPECT_EQ(controllers.back(), "06:00; 0; 0; 06:00,Supported,simulator; ");
 
     m_adapters->injectFault("eth2", {.at = ma::Operation::PciAddress});
     EXPECT_EQ(table("Quenx_EthernetPort", {"Name"}), (Rows{"eth0", "eth1", "eth3", "eth4"}));

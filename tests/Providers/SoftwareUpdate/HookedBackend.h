@@ -41,6 +41,7 @@ class HookedBackend : public ma::Backend {
     }
     void letGo() { m_holds = false; }
 
+    std::string name() const override { return m_next->name(); }
     utils::StringArray enumerateAdapters() override { return at("enumerateAdapters").enumerateAdapters(); }
     utils::PCIAddr getPCIAddress(const std::string& adapter) override {
         return at("getPCIAddress").getPCIAddress(adapter);
