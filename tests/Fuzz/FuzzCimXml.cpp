@@ -27,9 +27,10 @@ void checkResponse(std::string_view bytes) {
     }
 }
 
-/// Whatever a provider says, the answer is well-formed. An identifier has a bound of its own.
+/// Whatever a provider says, the answer is well-formed. An identifier has a bound of its own,
+/// 1024 bytes, and each byte that is no character becomes three.
 void checkText(const std::string& text) {
-    const cimxml::Response response{text.substr(0, 1024), text, true, text,
+    const cimxml::Response response{text.substr(0, 1024 / 3), text, true, text,
                                     cimxml::ErrorResult{core::CimStatus::Failed, text}};
     cimxml::readResponse(cimxml::writeResponse(response));
 }
