@@ -65,7 +65,8 @@ TEST(DevlinkInventoryTest, TellsWhatKernelAndDriverTell) {
 
 TEST(DevlinkInventoryTest, AsksADeviceOnceUntilItChanges) {
     const test::DevlinkBench bench;
-    EXPECT_THAT(ma::describeSearch(), testing::EndsWith("whether they can be updated: 0000:05:00.0, 0000:05:00.1."));
+    EXPECT_THAT(ma::describeSearch(),
+                testing::EndsWith("whether they can be updated: 0000:05:00.0, 0000:05:00.1."));
     EXPECT_EQ(0, bench.kernel->requests) << "a service that starts only lists names";
     EXPECT_EQ("1.2.3", runningVersion(bench.first));
     const int asked = bench.kernel->requests;
