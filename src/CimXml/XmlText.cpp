@@ -83,8 +83,8 @@ std::size_t xmlCharacterLength(std::string_view text) {
         if ((next & 0xC0U) != 0x80U) return 0;
         character = (character << 6) | (next & 0x3FU);
     }
-    constexpr char32_t kSmallest[] = {0, 0, 0x80, 0x800, 0x10000};
-    return character >= kSmallest[length] && isXmlCharacter(character) ? length : 0;
+    constexpr char32_t kSmallest[] = {0, 0x80, 0x800, 0x10000};
+    return character >= kSmallest[length - 1] && isXmlCharacter(character) ? length : 0;
 }
 
 bool isXmlText(std::string_view text) {

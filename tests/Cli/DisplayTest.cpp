@@ -66,6 +66,8 @@ TEST(ProgressTest, FitsTheWidthAndSaysNoMoreThanItKnows) {
     EXPECT_EQ(cli::lineText(half), "eth0: 50 %, 125.0 KiB of 250.0 KiB, 50.0 KiB/s, 0:03 left");
     EXPECT_EQ(cli::lineText({"eth0", 10, 0, milliseconds(5000), 10}), "eth0: 10 %");
     EXPECT_EQ(cli::lineText({"eth0", 20, 0, milliseconds(5000), 10}), "eth0: 20 %, 0:40 left");
+    EXPECT_EQ(cli::lineText({"eth0", 20, 0, milliseconds(299), 10}), "eth0: 20 %");
+    EXPECT_EQ(cli::lineText({"eth0", 20, 0, milliseconds(300), 10}), "eth0: 20 %, 0:03 left");
     EXPECT_EQ(cli::lineText({"eth0", 100, 1023, milliseconds(5000), 10}), "eth0: 100 %, 1023 B of 1023 B");
     EXPECT_EQ(cli::byteText(std::uint64_t{5} << 40), "5.0 TiB");
     EXPECT_EQ(cli::durationText(seconds(3723)), "1:02:03");

@@ -285,6 +285,12 @@ TEST_F(InstallVerbTest, SaysAfterAFailureOnlyWhatWasReadBack) {
         EXPECT_EQ(install(), ExitStatus::Failed);
         EXPECT_EQ(m_error.str(), "quenxctl: The update of eth0 failed: " + said);
     }
+    // Its folders are the server's.
+    m_service->jobs = {job(10, 100)};
+    m_service->jobs.back().properties.push_back(
+        {"ErrorDescription", CimValue::of(CimType::String, reason), false, {}});
+    EXPECT_EQ(run(cli::install, false), ExitStatus::Failed);
+    EXPECT_EQ(m_error.str(), "quenxctl: The update of eth0 failed: " + reason + " (error 0).\n");
     // A success stays one.
     m_service->jobs = {job(7, 100)};
     EXPECT_EQ(install(), ExitStatus::Done);

@@ -321,9 +321,11 @@ TEST_F(DispatcherTest, CountsTheRefusalsOfAFlood) {
     host::AuditTrail trail;
     const auto now = host::AuditTrail::Clock::now();
     for (int i = 0; i < 25; ++i)
+        trail.refused({i < 5 ? "a" : "b", "192.0.2.1", "Work", "t", "denied: x"}, {}, now);
+    for (int i = 0; i < 20; ++i)
         trail.refused({"a", "192.0.2.1", "Work", "t", "denied: x"}, {}, now);
     trail.writeNumbers(now + std::chrono::seconds(59));
-    EXPECT_EQ(test::SyslogCapture::count("[audit]"), 41U);
+    EXPECT_EQ(test::SyslogCapture::count("[audit]"), 61U);
     trail.writeNumbers(now + std::chrono::seconds(60));
     EXPECT_EQ(test::SyslogCapture::lines().back().text,
               "[audit] user=\"a\" address=\"192.0.2.1\" operation=\"Work\" target=\"\" arguments=\"\" "

@@ -86,9 +86,10 @@ Reason explainHolder(const Connection& connection, std::uint32_t returnValue, co
     if (!mayBeHeld || connection.isInProcess) return std::nullopt;
     for (const JobView& job : readJobs(*connection.operations)) {
         if (job.hasEnded()) continue;
+        const auto percent = job.certainPercent();
         return Explanation{(job.adapter.empty() ? "An adapter" : job.adapter) + " is being updated (" +
-                               job.id + ", " + std::to_string(job.certainPercent().value_or(0)) +
-                               " % done). The server updates one adapter at a time.",
+                               job.id + (percent ? ", " + std::to_string(*percent) + " % done" : "") +
+                               "). The server updates one adapter at a time.",
                            "Try again when that update has ended; \"quenxctl jobs\" shows its progress."};
     }
     return explainHiddenHolder(returnValue, candidate);

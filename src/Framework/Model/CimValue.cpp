@@ -33,16 +33,10 @@ bool fits(CimType type, T value) {
 template <class T>
 std::optional<CimScalar> parseInteger(CimType type, std::string_view text) {
     if (text.starts_with('+')) text.remove_prefix(1);
-    int base = 10;
-    const bool isNegative = text.starts_with('-');
-    if (const std::string_view digits = text.substr(isNegative ? 1 : 0);
-        digits.size() > 2 && (digits.starts_with("0x") || digits.starts_with("0X"))) {
-        // DSP0004 knows no negative hexadecimal numbers.
-        if (isNegative) return std::nullopt;
-        text = digits.substr(2);
-        base = 16;
-    }
-    const auto value = utils::parseNumber<T>(text, base);
+    // DSP0004 knows no negative hexadecimal numbers.
+    const bool isHexadecimal = text.size() > 2 && (text.starts_with("0x") || text.starts_with("0X"));
+    if (isHexadecimal) text.remove_prefix(2);
+    const auto value = utils::parseNumber<T>(text, isHexadecimal ? 16 : 10);
     if (!value || !fits(type, *value)) return std::nullopt;
     return CimScalar(*value);
 }

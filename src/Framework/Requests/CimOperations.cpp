@@ -94,19 +94,13 @@ CimPath typedReference(const CimPath& path, const ClassLookup& classes) {
     }
 }
 
-/// What a client may mix up, such as the widths of integers.
-bool isSameKind(CimType left, CimType right) {
-    const auto isInteger = [](CimType type) { return isUnsigned(type) || isSigned(type); };
-    const auto isText = [](CimType type) { return type == CimType::String || type == CimType::Char16; };
-    return left == right || (isInteger(left) && isInteger(right)) || (isReal(left) && isReal(right)) ||
-           (isText(left) && isText(right));
-}
-
-/// A path written as a text would be guessed at, so a reference is never read from one.
+/// Clients may mix up the widths of integers. A path or a date written as a text would be guessed at, so
+/// those are never converted.
 std::optional<CimScalar> typedElement(CimType type, const CimScalar& value, const Argument& given) {
     const auto* text = given.isUntyped ? std::get_if<std::string>(&value) : nullptr;
     if (text != nullptr && type != CimType::Reference) return parseScalar(type, *text);
-    return isSameKind(type, given.value.type) ? convertScalar(type, value) : std::nullopt;
+    const bool mustBeGivenSo = type == CimType::Reference || type == CimType::Datetime;
+    return mustBeGivenSo && given.value.type != type ? std::nullopt : convertScalar(type, value);
 }
 
 /// An order in which the same names are equal. Names are not copied for it: most are too long for that.

@@ -26,18 +26,17 @@ AuditTrail::~AuditTrail() {
 void AuditTrail::refused(const core::AuditEvent& event, const std::vector<core::Argument>& arguments,
                          Clock::time_point now) {
     writeNumbers(now);
-    unsigned int refusals = 0;
     {
         const utils::Mutex::AutoLocker lock(m_mutex);
         Minute& minute = m_minutes[event.user];
         if (minute.refusals == 0) minute.end = now + m_minute;
-        refusals = ++minute.refusals;
-        if (refusals > kListed) {
+        if (++minute.refusals > kListed) {
             minute.last = {event.user, event.address, event.operation.substr(0, kLongestName), "", ""};
             startWriter();
+            return;
         }
     }
-    if (refusals <= kListed) core::audit(event, arguments);
+    core::audit(event, arguments);
 }
 
 void AuditTrail::startWriter() {
