@@ -1,6 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Framework/Requests/Audit.h"
 
+#include <algorithm>
+#include <string_view>
+
 #include "Utils/Log.h"
 
 namespace core {
@@ -45,6 +48,16 @@ std::string outcomeOf(const MethodResult& result) {
 std::string outcomeOf(CimStatus status, const std::string& description) {
     if (status == CimStatus::AccessDenied) return "denied: " + description;
     return "failed: " + description + " (CIM status " + std::to_string(static_cast<int>(status)) + ")";
+}
+
+std::string shownText(const std::exception& error) {
+    constexpr std::size_t kMost = 2000;
+    const std::string_view whole = error.what();
+    std::size_t shown = std::min(whole.size(), kMost);
+    // Never half a character, which would make the answer unreadable.
+    while (shown > 0 && shown < whole.size() && (whole[shown] & 0xC0) == 0x80)
+        --shown;
+    return std::string(whole.substr(0, shown));
 }
 
 std::string auditLine(const AuditEvent& event, const std::vector<Argument>& arguments) {

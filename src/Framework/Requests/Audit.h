@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include <exception>
 #include <string>
 #include <vector>
 
@@ -23,6 +24,10 @@ struct AuditEvent {
 QUENX_EXPORT std::string outcomeOf(const MethodResult& result);
 /// "failed: ... (CIM status 6)", or "denied: ..." for one who may not.
 QUENX_EXPORT std::string outcomeOf(CimStatus status, const std::string& description);
+
+/// What an error says, as far as anybody reads it: some repeat names of the request, which may be a megabyte
+/// long.
+QUENX_EXPORT std::string shownText(const std::exception& error);
 
 /// The line, at most 1,300 characters of printable ASCII, whatever the event holds; docs/object-manager.md
 /// has its exact form.

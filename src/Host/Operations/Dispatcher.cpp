@@ -22,18 +22,6 @@ void requirePrivilege(Privilege privilege, const Caller& caller) {
     }
 }
 
-/// What an error says, as far as anybody reads it: some repeat names of the request, which may be a megabyte
-/// long.
-std::string shownText(const std::exception& error) {
-    constexpr std::size_t kMost = 2000;
-    const std::string_view whole = error.what();
-    std::size_t shown = std::min(whole.size(), kMost);
-    // Never half a character, which would make the answer unreadable.
-    while (shown > 0 && shown < whole.size() && (whole[shown] & 0xC0) == 0x80)
-        --shown;
-    return std::string(whole.substr(0, shown));
-}
-
 /// Whether the call changes something, or would. No method is known to change nothing: a check claims its
 /// adapter.
 bool isAudited(const cimxml::Request& request) {
@@ -147,7 +135,7 @@ cimxml::Response Dispatcher::carryOut(const cimxml::Request& request, const Call
             response.content = callOperation(std::get<cimxml::IntrinsicCall>(request.call), caller, charge);
         }
     } catch (const CimError& error) {
-        response.content = ErrorResult{error.status(), shownText(error)};
+        response.content = ErrorResult{error.status(), core::shownText(error)};
     } catch (const OverBudget&) {
         // Those that nobody reads on are let go of by the way, and nobody may come by if all are refused
         // here.
@@ -158,7 +146,7 @@ cimxml::Response Dispatcher::carryOut(const cimxml::Request& request, const Call
         response.content = ErrorResult{CimStatus::Failed, "out of memory"};
     } catch (const std::exception& error) {
         // A provider's fault is the answer to this request alone; the connection and the daemon go on.
-        response.content = ErrorResult{CimStatus::Failed, shownText(error)};
+        response.content = ErrorResult{CimStatus::Failed, core::shownText(error)};
     }
     return response;
 }
