@@ -4,9 +4,7 @@
 #include <pwd.h>
 #include <unistd.h>
 
-#include "Framework/Classes/CimBroker.h"
 #include "Framework/Classes/RequestScope.h"
-#include "Framework/Model/CimInstance.h"
 #include "Framework/Requests/Audit.h"
 #include "Providers/Schema/ProviderInterfaces.h"
 #include "Providers/Schema/ValueMaps.h"
@@ -140,7 +138,7 @@ std::optional<std::uint32_t> verifyOnly(const Connection& connection, const Cand
     if (!connection.isInProcess) return std::nullopt;
     // No method of the model does this; the service's own interface in this process does.
     const core::RequestScope scope;
-    auto* check = dynamic_cast<update::ImageCheck*>(core::GetCimBroker()->getInstanceByPath(call.service));
+    update::ImageCheck* check = update::findImageCheck(call.service);
     if (check == nullptr) return std::nullopt;
     const InstallCodes options(candidate);
     const unsigned int returned =

@@ -72,7 +72,7 @@ class QUENX_EXPORT SoftwareIdentityResource {
 
 namespace update {
 
-/// Judges images without installing them.
+/// Judges images without installing them, and tells which adapter the process holds.
 class QUENX_EXPORT ImageCheck {
   public:
     virtual ~ImageCheck();
@@ -82,6 +82,12 @@ class QUENX_EXPORT ImageCheck {
     virtual unsigned int checkImage(const std::string& uri, const core::CimPath& target,
                                     const std::vector<std::uint16_t>& options,
                                     const std::vector<std::string>& values) = 0;
+    /// The adapter that is claimed in this process, by an update or by a check; empty for none. Thread-safe.
+    virtual std::string claimedAdapter() const = 0;
 };
+
+/// The image check of the service that the path names, where it has one; null otherwise. Good until the
+/// calling thread's request scope ends.
+QUENX_EXPORT ImageCheck* findImageCheck(core::CimPath& service);
 
 }  // namespace update

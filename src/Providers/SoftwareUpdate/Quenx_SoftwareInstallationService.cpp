@@ -174,6 +174,10 @@ unsigned int Quenx_SoftwareInstallationService::checkImage(const std::string& ur
     return returnValueOf(kChecking, resultOfExamining(order), target.toString());
 }
 
+std::string Quenx_SoftwareInstallationService::claimedAdapter() const {
+    return Quenx_ConcreteJob::m_servicedAdapter.get();
+}
+
 void Quenx_SoftwareInstallationService::refresh() {
     // Asked before the lock, since the system may take its time.
     const std::string hostname = os::getHostname();

@@ -33,6 +33,7 @@ class Quenx_SoftwareInstallationService : public CIM_SoftwareInstallationService
     unsigned int checkImage(const std::string& uri, const core::CimPath& target,
                             const std::vector<std::uint16_t>& options,
                             const std::vector<std::string>& values) override;
+    std::string claimedAdapter() const override;
 
     /// "FirmwareUpdate", for every instance.
     static std::string getUniqId() { return "FirmwareUpdate"; }
