@@ -7,6 +7,9 @@ set(quenx_libraries Quenx_FileReader Quenx_Utils Quenx_CimFramework Quenx_MidAPI
 set_target_properties(${quenx_libraries} PROPERTIES INSTALL_RPATH "$ORIGIN")
 set_target_properties(quenxctl quenx-cimd PROPERTIES INSTALL_RPATH "$ORIGIN/../lib/quenx")
 install(TARGETS ${quenx_libraries} DESTINATION lib/quenx)
+# Where object managers look for providers.
+set_target_properties(Quenx_Cmpi PROPERTIES INSTALL_RPATH "$ORIGIN/../quenx")
+install(TARGETS Quenx_Cmpi DESTINATION lib/cmpi)
 install(TARGETS quenxctl DESTINATION bin)
 install(TARGETS quenx-cimd DESTINATION sbin)
 

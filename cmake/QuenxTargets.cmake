@@ -65,12 +65,16 @@ function(quenx_library name)
     endif()
 endfunction()
 
+# quenx_export_only(NAME SCRIPT): a library that exports what the version script names, and no template instance besides
+function(quenx_export_only name script)
+    target_link_options(${name} PRIVATE -Wl,--version-script=${script})
+    set_target_properties(${name} PROPERTIES LINK_DEPENDS ${script})
+endfunction()
+
 # quenx_provider(NAME SOURCES... [LINK targets...]): a library that a host loads, and that exports nothing. What it
 # exported would be bound to by whatever is loaded after it, the framework included, and would keep it mapped after
 # dlclose. The libraries below share their singletons and type information, so they keep their exports.
 function(quenx_provider name)
     quenx_library(${name} ${ARGN})
-    set(script ${PROJECT_SOURCE_DIR}/cmake/ExportsNothing.map)
-    target_link_options(${name} PRIVATE -Wl,--version-script=${script})
-    set_target_properties(${name} PROPERTIES LINK_DEPENDS ${script})
+    quenx_export_only(${name} ${PROJECT_SOURCE_DIR}/cmake/ExportsNothing.map)
 endfunction()

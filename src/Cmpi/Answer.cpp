@@ -1,0 +1,88 @@
+// SPDX-License-Identifier: Apache-2.0
+// How requests end.
+#include <pthread.h>
+
+#include "Cmpi/Request.h"
+#include "Cmpi/Slots.h"
+#include "Framework/Requests/Audit.h"
+
+namespace cmpi {
+
+namespace {
+
+using core::CimStatus;
+
+/// Object managers cancel threads of theirs that last too long. A cancelled one would unwind through code
+/// that turns every exception into an answer, which ends the process.
+class CancellationBan {
+  public:
+    CancellationBan() { ::pthread_setcancelstate(PTHREAD_CANCEL_DISABLE, &m_before); }
+    ~CancellationBan() { ::pthread_setcancelstate(m_before, nullptr); }
+    CancellationBan(const CancellationBan&) = delete;
+    CancellationBan& operator=(const CancellationBan&) = delete;
+
+  private:
+    int m_before = 0;
+};
+
+/// Object managers of this level know the codes up to 17.
+ReturnCode codeOf(CimStatus status) {
+    return status > CimStatus::MethodNotFound ? ReturnCode::Failed : static_cast<ReturnCode>(status);
+}
+
+/// The error as an instance of CIM_Error (DSP0004 5.2, DMTF CIM schema), where the object manager knows such.
+void giveError(const Broker& broker, const Result* result, ReturnCode code, const std::string& text) {
+    const bool isKnown = broker.eft != nullptr && broker.eft->ftVersion >= kLevel && result != nullptr &&
+                         result->ft != nullptr && result->ft->ftVersion >= kLevel;
+    if (!isKnown) return;
+    constexpr int kTypeSoftware = 4;
+    constexpr int kSeverityLow = 2;
+    constexpr int kSeverityHigh = 4;
+    constexpr int kCauseUnknown = 0;
+    constexpr int kCauseSoftwareError = 46;
+    const bool isOurFault = code == ReturnCode::Failed;
+    const std::string id = "QUENX" + std::to_string(static_cast<int>(code));
+    Error* error = call(broker, broker.eft, &BrokerEncTable::newCMPIError, "Quenx", id.c_str(), text.c_str(),
+                        isOurFault ? kSeverityHigh : kSeverityLow,
+                        isOurFault ? kCauseSoftwareError : kCauseUnknown, code, nullptr);
+    if (error == nullptr) return;
+    call(error, &ErrorTable::setErrorType, kTypeSoftware);
+    call(result, &ResultTable::returnError, error);
+}
+
+Status failure(const Sender& sender, CimStatus status, const std::string& text) {
+    const Broker& broker = Front::theOne().broker();
+    const ReturnCode code = codeOf(status);
+    giveError(broker, sender.result, code, text);
+    return {code, newString(broker, text)};
+}
+
+Status carryOut(const Sender& sender, const std::function<void(Request&)>& body) {
+    try {
+        Request request(sender);
+        body(request);
+        const Status done = call(sender.result, &ResultTable::returnDone);
+        if (done.rc == ReturnCode::Ok) return {ReturnCode::Ok, nullptr};
+        return failure(sender, CimStatus::Failed, "the object manager did not take the end of the results");
+    } catch (const core::CimError& error) {
+        return failure(sender, error.status(), core::shownText(error));
+    } catch (const std::bad_alloc&) {
+        return failure(sender, CimStatus::Failed, "out of memory");
+    } catch (const std::exception& error) {
+        return failure(sender, CimStatus::Failed, core::shownText(error));
+    }
+}
+
+}  // namespace
+
+Status answerWith(const Sender& sender, const std::function<void(Request&)>& body) noexcept {
+    const CancellationBan ban;
+    try {
+        return carryOut(sender, body);
+    } catch (...) {
+        // Not even the text could be built.
+        return {ReturnCode::Failed, nullptr};
+    }
+}
+
+}  // namespace cmpi

@@ -1,0 +1,97 @@
+// SPDX-License-Identifier: Apache-2.0
+// Walking associations.
+#include "Cmpi/EntryPoints.h"
+#include "Cmpi/Request.h"
+#include "Cmpi/Slots.h"
+
+namespace cmpi {
+
+namespace {
+
+using core::AssociationFilter;
+
+/// What narrows a walk, as the object manager says it: null or empty narrows nothing.
+struct Narrowing {
+    const char* associationClass;
+    const char* resultClass;
+    const char* role;
+    const char* resultRole;
+};
+
+/// Runs the walk where all the classes named are known here. The object manager asks every provider whose
+/// associations might fit, and has looked at the names itself: who knows nothing of one has nothing to add.
+template <class Body>
+Status walk(const Sender& sender, const Narrowing& by, const Body& body) noexcept {
+    return answer(sender, [&](Request& request) {
+        const AssociationFilter filter{textOf(by.associationClass), textOf(by.resultClass), textOf(by.role),
+                                       textOf(by.resultRole)};
+        const auto isKnown = [&](const std::string& name) { return name.empty() || request.isOurs(name); };
+        if (request.isOurs() && isKnown(filter.associationClass) && isKnown(filter.resultClass))
+            body(request, filter);
+    });
+}
+
+void giveAll(Request& request, const std::vector<core::InstanceValue>& instances, const char** properties) {
+    const core::PropertyFilter filter = filterFrom(properties);
+    for (const core::InstanceValue& each : instances)
+        request.give(each, filter);
+}
+
+void giveAll(Request& request, const std::vector<core::CimPath>& paths) {
+    for (const core::CimPath& each : paths)
+        request.give(each);
+}
+
+Status associators(AssociationMI*, const Context* context, const Result* result, const ObjectPath* object,
+                   const char* associationClass, const char* resultClass, const char* role,
+                   const char* resultRole, const char** properties) {
+    return walk({Interface::Association, context, result, object},
+                {associationClass, resultClass, role, resultRole},
+                [properties](Request& request, const AssociationFilter& by) {
+                    giveAll(request, request.operations().associators(request.object(), by), properties);
+                });
+}
+
+Status associatorNames(AssociationMI*, const Context* context, const Result* result, const ObjectPath* object,
+                       const char* associationClass, const char* resultClass, const char* role,
+                       const char* resultRole) {
+    return walk({Interface::Association, context, result, object},
+                {associationClass, resultClass, role, resultRole},
+                [](Request& request, const AssociationFilter& by) {
+                    giveAll(request, request.operations().associatorNames(request.object(), by));
+                });
+}
+
+Status references(AssociationMI*, const Context* context, const Result* result, const ObjectPath* object,
+                  const char* resultClass, const char* role, const char** properties) {
+    return walk({Interface::Association, context, result, object}, {nullptr, resultClass, role, nullptr},
+                [properties](Request& request, const AssociationFilter& by) {
+                    giveAll(request, request.operations().references(request.object(), by), properties);
+                });
+}
+
+Status referenceNames(AssociationMI*, const Context* context, const Result* result, const ObjectPath* object,
+                      const char* resultClass, const char* role) {
+    return walk({Interface::Association, context, result, object}, {nullptr, resultClass, role, nullptr},
+                [](Request& request, const AssociationFilter& by) {
+                    giveAll(request, request.operations().referenceNames(request.object(), by));
+                });
+}
+
+Status cleanup(AssociationMI*, const Context*, Boolean) {
+    return cleanUp(Interface::Association);
+}
+
+constexpr AssociationMITable kTable{kLevel,      kLevel,          kProviderName, cleanup,
+                                    associators, associatorNames, references,    referenceNames};
+
+AssociationMI theInterface{{nullptr, &kTable}};
+
+}  // namespace
+
+}  // namespace cmpi
+
+cmpi::AssociationMI* Quenx_Create_AssociationMI(const cmpi::Broker* broker, const cmpi::Context*,
+                                                cmpi::Status* status) {
+    return cmpi::create(cmpi::Interface::Association, cmpi::theInterface, broker, status);
+}

@@ -1,0 +1,131 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "Cmpi/Request.h"
+
+#include "Cmpi/Slots.h"
+#include "Framework/Requests/Audit.h"
+
+namespace cmpi {
+
+namespace {
+
+using core::CimError;
+using core::CimStatus;
+
+/// What the object manager frees at the end of the call would grow with the number of results. Where it has
+/// marks, what is made in the scope goes at once.
+class Temporaries {
+  public:
+    explicit Temporaries(const Broker& broker) : m_broker(broker) {
+        if (broker.mft != nullptr && broker.mft->release != nullptr)
+            m_mark = call(broker, broker.mft, &BrokerMemTable::mark, nullptr);
+    }
+    ~Temporaries() {
+        if (m_mark != nullptr) call(m_broker, m_broker.mft, &BrokerMemTable::release, m_mark);
+    }
+    Temporaries(const Temporaries&) = delete;
+    Temporaries& operator=(const Temporaries&) = delete;
+
+  private:
+    const Broker& m_broker;
+    void* m_mark = nullptr;
+};
+
+/// The properties that the client gets. Given to the instance before anything is set, as object managers
+/// want it.
+void setFilter(Instance* instance, const core::InstanceValue& value, const core::PropertyFilter& filter) {
+    std::vector<const char*> names;
+    for (const std::string& name : *filter)
+        names.push_back(name.c_str());
+    names.push_back(nullptr);
+    std::vector<const char*> keys;
+    for (const core::PropertyValue& property : value.properties) {
+        if (property.isKey) keys.push_back(property.name.c_str());
+    }
+    keys.push_back(nullptr);
+    call(instance, &InstanceTable::setPropertyFilter, names.data(), keys.data());
+}
+
+Instance* newInstance(const Place& place, const core::InstanceValue& value,
+                      const core::PropertyFilter& filter) {
+    Instance* instance = call(place.broker, place.broker.eft, &BrokerEncTable::newInstance,
+                              newPath(place, value.path), nullptr);
+    if (instance == nullptr)
+        throw CimError(CimStatus::Failed,
+                       "the object manager could not make an instance of " + value.path.getClassName());
+    if (filter) setFilter(instance, value, filter);
+    const core::WantedProperties wanted(filter);
+    for (const core::PropertyValue& property : value.properties) {
+        if (!property.isKey && !wanted.includes(property.name)) continue;
+        const Given given(place, property.value);
+        // A property that the object manager's classes do not have is no reason to give none of the others.
+        call(instance, &InstanceTable::setProperty, property.name.c_str(), given.value(), given.type());
+    }
+    return instance;
+}
+
+/// The namespace of the call; that which is served where the object manager does not say.
+std::string requestedNamespace(const ObjectPath* object, const std::string& served) {
+    const std::string given = textOf(call(object, &ObjectPathTable::getNameSpace, nullptr));
+    return given.empty() ? served : given;
+}
+
+}  // namespace
+
+Request::Request(const Sender& sender)
+    : m_sender(sender),
+      m_use(sender.interface),
+      m_place{Front::theOne().broker(), requestedNamespace(sender.object, operations().getNamespace()),
+              operations().getNamespace()},
+      m_object(pathFrom(m_place, sender.object)) {}
+
+void Request::take(Status status) const {
+    if (status.rc == ReturnCode::Ok) return;
+    throw CimError(CimStatus::Failed, "the object manager did not take a result (code " +
+                                          std::to_string(static_cast<int>(status.rc)) + ")");
+}
+
+void Request::give(const core::CimPath& path) {
+    const Temporaries temporaries(m_place.broker);
+    take(call(m_sender.result, &ResultTable::returnObjectPath, newPath(m_place, path)));
+}
+
+void Request::give(const core::InstanceValue& instance, const core::PropertyFilter& filter) {
+    const Temporaries temporaries(m_place.broker);
+    take(call(m_sender.result, &ResultTable::returnInstance, newInstance(m_place, instance, filter)));
+}
+
+void Request::give(core::CimType type, const core::CimScalar& value) {
+    const Given given(m_place, type, value);
+    take(call(m_sender.result, &ResultTable::returnData, given.value(), given.type()));
+}
+
+void Request::audited(const std::string& operation, const std::vector<core::Argument>& arguments,
+                      const std::function<std::string()>& work) const {
+    const core::CimValue user =
+        valueFrom(m_place, call(m_sender.context, &ContextTable::getEntry, "CMPIPrincipal", nullptr));
+    const std::string* name = user.get<std::string>();
+    const BrokerTable* manager = m_place.broker.bft;
+    core::CimPath target = m_object;
+    target.setNamespace(m_place.requested);
+    core::AuditEvent event{name == nullptr ? "" : *name,
+                           "cmpi:" + textOf(manager == nullptr ? nullptr : manager->brokerName), operation,
+                           target.toString(), ""};
+    try {
+        event.outcome = work();
+    } catch (const CimError& error) {
+        event.outcome = core::outcomeOf(error.status(), error.what());
+        core::audit(event, arguments);
+        throw;
+    }
+    core::audit(event, arguments);
+}
+
+core::PropertyFilter filterFrom(const char** names) {
+    if (names == nullptr) return std::nullopt;
+    std::vector<std::string> filter;
+    for (; *names != nullptr; ++names)
+        filter.emplace_back(*names);
+    return filter;
+}
+
+}  // namespace cmpi

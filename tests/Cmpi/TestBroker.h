@@ -1,0 +1,96 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include <deque>
+#include <memory>
+#include <ostream>
+
+#include "Cmpi/Cmpi.h"
+#include "Framework/Requests/CimOperations.h"
+
+/// An object manager's side of the interface, in the manners of two real ones. What breaks a rule of
+/// ownership ends the program with a message.
+namespace test {
+
+/// What is missing and how absence is said: as sfcb 1.4, and as OpenPegasus 2.14.
+enum class Dialect { Sfcb, Pegasus };
+inline constexpr Dialect kDialects[] = {Dialect::Sfcb, Dialect::Pegasus};
+inline void PrintTo(Dialect dialect, std::ostream* out) {
+    *out << (dialect == Dialect::Sfcb ? "sfcb" : "pegasus");
+}
+
+/// A property, key, argument, element of an array or entry of a context. State and type are what the front is
+/// told, so a test can lie.
+struct Entry {
+    Entry(std::string itsName, const core::CimValue& itsValue, cmpi::State itsState = 0);
+    std::string name;
+    core::CimValue value;
+    cmpi::State state;
+    cmpi::Type type;
+};
+
+/// Any object of the interface; begins as all of them do. It is of the call that it was made in.
+struct Node {
+    void* hdl;
+    const void* ft;
+    std::string text;  ///< of a string or a datetime; the namespace of a path, also of an instance's
+    std::string className = {};
+    std::vector<Entry> entries = {};
+    std::vector<Entry> keys = {};  ///< of an instance
+    core::PropertyFilter filter = {};
+    bool isAlive = true;
+
+    template <class Handle>
+    Handle* as() {
+        return reinterpret_cast<Handle*>(this);
+    }
+};
+
+/// The tables of one dialect; public, so that a test can take a slot away.
+struct TestBroker {
+    explicit TestBroker(Dialect dialect);
+    bool isSfcb;
+    cmpi::Broker broker{};
+    cmpi::BrokerTable table{};
+    cmpi::BrokerEncTable factories{};
+    cmpi::BrokerMemTable memory{};
+    cmpi::ContextTable contexts{};
+    cmpi::ResultTable results{};
+    cmpi::StringTable strings{};
+    cmpi::ArrayTable arrays{};
+    cmpi::InstanceTable instances{};
+    cmpi::ObjectPathTable paths{};
+    cmpi::ArgsTable args{};
+    cmpi::DateTimeTable dateTimes{};
+    cmpi::ErrorTable errors{};
+};
+
+/// What came back.
+struct Answers {
+    std::vector<core::InstanceValue> instances = {};
+    std::vector<core::CimPath> paths = {};
+    core::MethodResult called = {};
+    int done = 0;
+    std::string error = {};  ///< the message of the CIM_Error
+};
+
+/// One call of an MI function, on the thread that makes it. What was made for it dies with it.
+struct Call {
+    explicit Call(const TestBroker& manager, std::string requestedNamespace = "root/cimv2");
+    Call(const Call&) = delete;
+    ~Call();
+    Node& make(const void* table, const std::string& text = {});
+    Node& path(const core::CimPath& path);
+    Node& arguments(const std::vector<core::Argument>& arguments, const void* table = nullptr);
+    /// Checks the end of a call, and throws its failure as CimError.
+    Answers finish(cmpi::Status status);
+
+    const TestBroker& broker;
+    const std::string nameSpace;
+    std::deque<std::unique_ptr<Node>> nodes;
+    const cmpi::Context* context;
+    const cmpi::Result* result;
+    Answers answers;
+};
+
+}  // namespace test
