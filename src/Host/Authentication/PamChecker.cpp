@@ -76,8 +76,8 @@ std::optional<std::pair<uid_t, gid_t>> findAccount(const std::string& user) {
     passwd* found = nullptr;
     std::array<char, 16384> buffer{};
     // Not getpwnam(): requests are served on many threads.
-    if (::getpwnam_r(user.c_str(), &entry, buffer.data(), buffer.size(), &found) != 0 || found == nullptr)
-        return std::nullopt;
+    ::getpwnam_r(user.c_str(), &entry, buffer.data(), buffer.size(), &found);
+    if (found == nullptr) return std::nullopt;
     return std::pair(entry.pw_uid, entry.pw_gid);
 }
 

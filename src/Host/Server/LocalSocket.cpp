@@ -59,7 +59,7 @@ void requireOwnFolder(const std::string& path) {
 int connectTo(const std::string& path) {
     const sockaddr_un address = addressOf(path);
     const os::Descriptor probe(::socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC | SOCK_NONBLOCK, 0));
-    if (probe.number() < 0) return errno;
+    if (!probe.isOpen()) return errno;
     return ::connect(probe.number(), reinterpret_cast<const sockaddr*>(&address), sizeof address) == 0
                ? 0
                : errno;

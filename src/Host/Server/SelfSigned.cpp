@@ -90,7 +90,7 @@ Certificate makeCertificate(gnutls_x509_privkey_t key) {
     // On a machine that does not know the time yet, it must outlive the day on which it learns that.
     check(::gnutls_x509_crt_set_expiration_time(raw, std::max(now, kTooEarly) + kLifetime));
     check(::gnutls_x509_crt_set_key(raw, key));
-    check(::gnutls_x509_crt_set_basic_constraints(raw, 0, -1));
+    check(::gnutls_x509_crt_set_ca_status(raw, 0));
     check(::gnutls_x509_crt_set_key_usage(raw, GNUTLS_KEY_DIGITAL_SIGNATURE));
     check(::gnutls_x509_crt_set_key_purpose_oid(raw, GNUTLS_KP_TLS_WWW_SERVER, 0));
     check(::gnutls_x509_crt_sign2(raw, raw, key, GNUTLS_DIG_SHA256, 0));
@@ -105,7 +105,7 @@ Certificate makeCertificate(gnutls_x509_privkey_t key) {
 void writeFile(const std::string& path, const gnutls_datum_t& content, mode_t mode) {
     // The mode from the start, so that nobody can open a key while it is being written.
     const os::Descriptor file(::open(path.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, mode));
-    if (file.number() < 0) failToWrite(path, std::strerror(errno));
+    if (!file.isOpen()) failToWrite(path, std::strerror(errno));
     const ssize_t written = ::write(file.number(), content.data, content.size);
     const int error = errno;
     if (written != static_cast<ssize_t>(content.size)) {

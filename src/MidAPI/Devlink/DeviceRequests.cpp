@@ -32,7 +32,7 @@ std::string refusalOfComponent(DevlinkConnection& connection, const std::string&
         // An empty name is never looked for, and it is looked at last.
         request.putText(DEVLINK_ATTR_FLASH_UPDATE_FILE_NAME, "");
     });
-    const bool isAccepted = !answer.isLost && answer.result.error != 0 && answer.result.offset == fileName;
+    const bool isAccepted = !answer.isLost && answer.result.offset == fileName;
     return isAccepted ? "" : describe(answer);
 }
 

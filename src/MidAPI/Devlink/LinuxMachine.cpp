@@ -95,7 +95,7 @@ os::Descriptor LinuxMachine::openNetlink() {
     // Room for a storm of notifications. The kernel cuts it to what it allows.
     constexpr int kReceiveBuffer = 1 << 20;
     os::Descriptor socket(::socket(AF_NETLINK, SOCK_RAW | SOCK_CLOEXEC, NETLINK_GENERIC));
-    if (socket.number() < 0) fail(kCannotOpen);
+    if (!socket.isOpen()) fail(kCannotOpen);
     ::setsockopt(socket.number(), SOL_SOCKET, SO_RCVBUF, &kReceiveBuffer, sizeof kReceiveBuffer);
     const sockaddr_nl any{.nl_family = AF_NETLINK, .nl_pad = 0, .nl_pid = 0, .nl_groups = 0};
     if (::bind(socket.number(), reinterpret_cast<const sockaddr*>(&any), sizeof any) != 0) fail(kCannotOpen);
@@ -136,7 +136,7 @@ void LinuxMachine::makeFolder(const std::string& path) {
 os::Descriptor LinuxMachine::createFile(const std::string& path) {
     constexpr int kFlags = O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC;
     os::Descriptor file(::open(path.c_str(), kFlags, S_IRUSR | S_IWUSR));
-    if (file.number() < 0) fail("cannot make the file " + path);
+    if (!file.isOpen()) fail("cannot make the file " + path);
     return file;
 }
 

@@ -81,9 +81,9 @@ bool closeToOthers(int descriptor) noexcept {
 bool closeFolderToOthers(const std::string& path) {
     const std::string purpose = "cannot use the folder";
     const Descriptor folder(::open(path.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC | O_NOFOLLOW));
-    if (folder.number() < 0 && errno == ENOENT) return false;
+    if (!folder.isOpen() && errno == ENOENT) return false;
     struct stat status {};
-    if (folder.number() < 0 || ::fstat(folder.number(), &status) != 0) fail(errno, purpose + " " + path);
+    if (!folder.isOpen() || ::fstat(folder.number(), &status) != 0) fail(errno, purpose + " " + path);
     if (status.st_uid != ::geteuid()) throw ForeignFile(path, status.st_uid, purpose);
     requireSafePlace(folder, path, purpose);
     if (!closeToOthers(folder.number())) fail(errno, "cannot protect the folder " + path);
@@ -102,7 +102,7 @@ void writeAll(int file, std::span<const std::uint8_t> bytes, const std::string& 
 
 void syncFolder(const std::string& path) {
     const Descriptor folder(::open(path.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
-    if (folder.number() < 0) fail(errno, "cannot open the folder " + path);
+    if (!folder.isOpen()) fail(errno, "cannot open the folder " + path);
     if (::fsync(folder.number()) != 0) fail(errno, "cannot bring the folder " + path + " to the medium");
 }
 

@@ -123,7 +123,7 @@ void carryOut(Reading& reading) {
     if (kindOf(status) == FileKind::CannotBeOpened) return;
     reached(reading);
     const Descriptor file(openForReading(reading.path));
-    if (file.number() < 0) reading.error = errno;
+    if (!file.isOpen()) reading.error = errno;
     // A process without standard input gets number 0 here, and counts as one that cannot open files.
     if (file.number() <= 0) return;
     const bool isKnown = ::fstat(file.number(), &status) == 0;

@@ -107,7 +107,7 @@ std::size_t readFile(const std::string& path, std::span<std::uint8_t> buffer) no
     struct stat status {};
     if (stat(path.c_str(), &status) != 0 || !S_ISREG(status.st_mode)) return 0;
     const Descriptor file(openForReading(path));
-    if (file.number() < 0 || fstat(file.number(), &status) != 0 || !S_ISREG(status.st_mode)) return 0;
+    if (!file.isOpen() || fstat(file.number(), &status) != 0 || !S_ISREG(status.st_mode)) return 0;
     std::size_t count = 0;
     readUpTo(file, buffer, count);
     return count;
@@ -116,9 +116,9 @@ std::size_t readFile(const std::string& path, std::span<std::uint8_t> buffer) no
 std::optional<std::vector<std::uint8_t>> readWholeFile(const std::string& path, std::size_t most) {
     constexpr std::size_t kStep = std::size_t{256} * 1024;
     const Descriptor file(openForReading(path));
-    if (file.number() < 0 && errno == ENOENT) return std::nullopt;
+    if (!file.isOpen() && errno == ENOENT) return std::nullopt;
     std::vector<std::uint8_t> bytes;
-    int error = file.number() < 0 ? errno : 0;
+    int error = file.isOpen() ? 0 : errno;
     // Read in steps, not by the size that the system tells: files in /proc have none, and a file may grow.
     for (bool more = true; more && error == 0 && bytes.size() < most;) {
         const std::size_t length = bytes.size();

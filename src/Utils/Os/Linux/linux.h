@@ -92,11 +92,12 @@ class Descriptor {
   public:
     explicit Descriptor(int number) noexcept : m_number(number) {}
     ~Descriptor() {
-        if (m_number >= 0) ::close(m_number);
+        if (isOpen()) ::close(m_number);
     }
     Descriptor(Descriptor&& other) noexcept : m_number(std::exchange(other.m_number, -1)) {}
     Descriptor(const Descriptor&) = delete;
     Descriptor& operator=(const Descriptor&) = delete;
+    bool isOpen() const noexcept { return m_number >= 0; }
     int number() const noexcept { return m_number; }
 
   private:
