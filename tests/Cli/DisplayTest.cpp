@@ -7,6 +7,7 @@
 
 #include "Cli/Display/Output.h"
 #include "Cli/Display/Progress.h"
+#include "Cli/Update/Jobs.h"
 
 namespace {
 
@@ -71,6 +72,16 @@ TEST(ProgressTest, FitsTheWidthAndSaysNoMoreThanItKnows) {
     EXPECT_EQ(cli::lineText({"eth0", 100, 1023, milliseconds(5000), 10}), "eth0: 100 %, 1023 B of 1023 B");
     EXPECT_EQ(cli::byteText(std::uint64_t{5} << 40), "5.0 TiB");
     EXPECT_EQ(cli::durationText(seconds(3723)), "1:02:03");
+}
+
+TEST(JobViewTest, NamesItsState) {
+    std::string names;
+    cli::JobView job;
+    for (job.state = 1; job.state < 14; ++job.state)
+        names += job.stateName() + ", ";
+    EXPECT_EQ(names,
+              "State 1, New, Starting, Running, Suspended, Shutting Down, Completed, Terminated, Killed, "
+              "Exception, Service, Query Pending, State 13, ");
 }
 
 /// What a display writes into a file when it sees these percentages, a second apart.

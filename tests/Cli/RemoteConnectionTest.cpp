@@ -149,6 +149,9 @@ TEST(RemoteConnectionTest, SendsAChangeOnce) {
     }
 }
 
+const std::string kBusy =
+    "The server is busy, or it blocks log-ins from this address for a while after wrong passwords. ";
+
 std::string classBelow(const std::string& name, const std::string& superclass) {
     return "<CLASS NAME='" + name + "' SUPERCLASS='" + superclass + "'/>";
 }
@@ -201,6 +204,34 @@ TEST(RemoteConnectionTest, GivesUpAnswersWithoutEnd) {
     });
     EXPECT_THAT([&] { server.connect().operations->enumerateInstanceNames("Y"); },
                 ThrowsMessage<cli::NoAnswer>(HasSubstr(" is larger than 256 MiB ")));
+}
+
+TEST(RemoteConnectionTest, SaysWhatAnHttpStatusMeans) {
+    const std::pair<const char*, std::string> table[] = {
+        {"401 X",
+         "The server does not accept the user name and password. Check --user or QUENXCTL_USER, and "
+         "QUENXCTL_PASSWORD or what was typed."},
+        {"403 X",
+         "This user may not use the server. On quenx-cimd, log in as root, as a member of the group "
+         "quenx-admin, or as a user whom its setting auth.readers names."},
+        {"503 X\r\nRetry-After: 7", kBusy + "Try again in 7 seconds."},
+        {"503 X\r\nretry-after:Fri, 31 Dec 1999 23:59:59 GMT", kBusy + "Try again in a while."},
+        {"501 X\r\nCIMError: unsupported-operation",
+         "The server answered with HTTP status 501 (unsupported-operation). Check that --server names a "
+         "CIM-XML server; its log has the details."},
+    };
+    for (const auto& [head, said] : table) {
+        const ToldServer server([&](int client, const std::string&) {
+            ToldServer::sendBytes(client, "HTTP/1.1 " + std::string(head) +
+                                              "\r\nConnection: close\r\nContent-Length: 0\r\n\r\n");
+        });
+        try {
+            server.connect().operations->getInstance(core::CimPath("Y.Name=\"1\""));
+            ADD_FAILURE() << head;
+        } catch (const cli::CommandError& error) {
+            EXPECT_EQ(error.what() + (' ' + error.advice()), said);
+        }
+    }
 }
 
 TEST(RemoteConnectionTest, ReadsAListWholeFromAServerWithoutPieces) {

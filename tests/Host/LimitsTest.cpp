@@ -25,7 +25,8 @@ TEST(AnswerBudgetTest, KeepsRoomForOthersAndForSmallAnswers) {
     AnswerCharge small(budget, "a");
     std::optional<AnswerCharge> large(std::in_place, budget, "a");
     large->set(3 * kMebibyte);
-    EXPECT_THROW(AnswerCharge(budget, "a").add(100000), OverBudget);
+    for (int round = 0; round < 2; ++round)
+        EXPECT_THROW(AnswerCharge(budget, "a").add(100000), OverBudget);
     small.set(65536);
     AnswerCharge other(budget, "b");
     other.add(kMebibyte);

@@ -82,6 +82,7 @@ TEST(LinuxTest, ReadsWholeFilesUpToALimit) {
     };
     EXPECT_EQ(sizeRead(folder.write("large", large), SIZE_MAX), large.size());
     EXPECT_EQ(sizeRead(folder / "large", 300 * 1024), 300U * 1024);
+    EXPECT_EQ(os::readSystemText(folder.write("huge", large + large)).value().size(), 1U << 20);
     EXPECT_GT(sizeRead("/proc/self/status", 4096), 0U) << "a file whose size the system does not tell";
     ASSERT_EQ(mkfifo((folder / "fifo").c_str(), 0600), 0);
     EXPECT_EQ(sizeRead(folder / "fifo", 10), 0U) << "and does not hang";
