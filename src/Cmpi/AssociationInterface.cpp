@@ -18,15 +18,31 @@ struct Narrowing {
     const char* resultRole;
 };
 
+/// sfcb asks once for every association class that is registered, and says which one it is about only in what
+/// the registration has as parameters. If each time all of them answered, clients would get every result as
+/// often.
+/// @param association  narrowed to that class; false when that one is not below it
+bool narrowToRegistration(const Request& request, std::string& association) {
+    const std::string registered = request.contextEntry("sfcbProviderParameters");
+    const core::ClassChain chain = request.operations().getClass(registered);
+    if (chain.empty() || !core::isAssociation(chain)) return true;
+    if (!association.empty() && !core::derivesFrom(chain, association)) return false;
+    association = registered;
+    return true;
+}
+
 /// Runs the walk where all the classes named are known here. The object manager asks every provider whose
 /// associations might fit, and has looked at the names itself: who knows nothing of one has nothing to add.
+/// @param association  where the filter names the association
 template <class Body>
-Status walk(const Sender& sender, const Narrowing& by, const Body& body) noexcept {
+Status walk(const Sender& sender, const Narrowing& by, std::string AssociationFilter::*association,
+            const Body& body) noexcept {
     return answer(sender, [&](Request& request) {
-        const AssociationFilter filter{textOf(by.associationClass), textOf(by.resultClass), textOf(by.role),
-                                       textOf(by.resultRole)};
+        AssociationFilter filter{textOf(by.associationClass), textOf(by.resultClass), textOf(by.role),
+                                 textOf(by.resultRole)};
         const auto isKnown = [&](const std::string& name) { return name.empty() || request.isOurs(name); };
-        if (request.isOurs() && isKnown(filter.associationClass) && isKnown(filter.resultClass))
+        if (request.isOurs() && isKnown(filter.associationClass) && isKnown(filter.resultClass) &&
+            narrowToRegistration(request, filter.*association))
             body(request, filter);
     });
 }
@@ -46,7 +62,7 @@ Status associators(AssociationMI*, const Context* context, const Result* result,
                    const char* associationClass, const char* resultClass, const char* role,
                    const char* resultRole, const char** properties) {
     return walk({Interface::Association, context, result, object},
-                {associationClass, resultClass, role, resultRole},
+                {associationClass, resultClass, role, resultRole}, &AssociationFilter::associationClass,
                 [properties](Request& request, const AssociationFilter& by) {
                     giveAll(request, request.operations().associators(request.object(), by), properties);
                 });
@@ -56,7 +72,7 @@ Status associatorNames(AssociationMI*, const Context* context, const Result* res
                        const char* associationClass, const char* resultClass, const char* role,
                        const char* resultRole) {
     return walk({Interface::Association, context, result, object},
-                {associationClass, resultClass, role, resultRole},
+                {associationClass, resultClass, role, resultRole}, &AssociationFilter::associationClass,
                 [](Request& request, const AssociationFilter& by) {
                     giveAll(request, request.operations().associatorNames(request.object(), by));
                 });
@@ -65,7 +81,7 @@ Status associatorNames(AssociationMI*, const Context* context, const Result* res
 Status references(AssociationMI*, const Context* context, const Result* result, const ObjectPath* object,
                   const char* resultClass, const char* role, const char** properties) {
     return walk({Interface::Association, context, result, object}, {nullptr, resultClass, role, nullptr},
-                [properties](Request& request, const AssociationFilter& by) {
+                &AssociationFilter::resultClass, [properties](Request& request, const AssociationFilter& by) {
                     giveAll(request, request.operations().references(request.object(), by), properties);
                 });
 }
@@ -73,7 +89,7 @@ Status references(AssociationMI*, const Context* context, const Result* result, 
 Status referenceNames(AssociationMI*, const Context* context, const Result* result, const ObjectPath* object,
                       const char* resultClass, const char* role) {
     return walk({Interface::Association, context, result, object}, {nullptr, resultClass, role, nullptr},
-                [](Request& request, const AssociationFilter& by) {
+                &AssociationFilter::resultClass, [](Request& request, const AssociationFilter& by) {
                     giveAll(request, request.operations().referenceNames(request.object(), by));
                 });
 }

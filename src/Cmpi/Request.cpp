@@ -99,15 +99,19 @@ void Request::give(core::CimType type, const core::CimScalar& value) {
     take(call(m_sender.result, &ResultTable::returnData, given.value(), given.type()));
 }
 
+std::string Request::contextEntry(const char* name) const {
+    const core::CimValue value =
+        valueFrom(m_place, call(m_sender.context, &ContextTable::getEntry, name, nullptr));
+    const std::string* text = value.get<std::string>();
+    return text == nullptr ? "" : *text;
+}
+
 void Request::audited(const std::string& operation, const std::vector<core::Argument>& arguments,
                       const std::function<std::string()>& work) const {
-    const core::CimValue user =
-        valueFrom(m_place, call(m_sender.context, &ContextTable::getEntry, "CMPIPrincipal", nullptr));
-    const std::string* name = user.get<std::string>();
     const BrokerTable* manager = m_place.broker.bft;
     core::CimPath target = m_object;
     target.setNamespace(m_place.requested);
-    core::AuditEvent event{name == nullptr ? "" : *name,
+    core::AuditEvent event{contextEntry("CMPIPrincipal"),
                            "cmpi:" + textOf(manager == nullptr ? nullptr : manager->brokerName), operation,
                            target.toString(), ""};
     try {

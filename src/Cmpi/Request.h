@@ -33,6 +33,8 @@ class Request {
     /// Whether the class is known here. Object managers ask every provider that may know something.
     bool isOurs() const { return isOurs(m_object.getClassName()); }
     bool isOurs(const std::string& className) const { return !operations().getClass(className).empty(); }
+    /// A text that the object manager tells of the request; empty where it does not.
+    std::string contextEntry(const char* name) const;
 
     /// Results, any number of them.
     void give(const core::CimPath& path);

@@ -225,6 +225,26 @@ TEST_F(CmpiOperationsTest, WalksAssociationsAsTheyAreNarrowed) {
     }
 }
 
+TEST_F(CmpiOperationsTest, AnswersForTheAssociationOfTheRegistrationAlone) {
+    const CimPath port = m_requests.enumerateInstanceNames("Quenx_EthernetPort").front();
+    m_fronts[0].create();
+    for (const core::ClassChain& chain : m_requests.enumerateClasses("", true)) {
+        if (!core::isAssociation(chain)) continue;
+        const std::string& name = m_fronts[0].broker.parameters = chain.front()->name;
+        for (const Op op : m_walks) {
+            const bool isOfClass = op == Op::Associators || op == Op::AssociatorNames;
+            const auto by = [&](const std::string& association) {
+                return isOfClass ? AssociationFilter{association, "", "", ""}
+                                 : AssociationFilter{"", association, "", ""};
+            };
+            const std::string expected = described(inProcess(m_requests, {op, port, by(name)}));
+            EXPECT_EQ(described(m_fronts[0].ask({op, port})), expected) << name;
+            EXPECT_EQ(described(m_fronts[0].ask({op, port, by(chain.back()->name)})), expected) << name;
+            EXPECT_EQ(described(m_fronts[0].ask({op, port, by("Test_Thing")})), described({})) << name;
+        }
+    }
+}
+
 TEST_F(CmpiOperationsTest, CallsMethodsDeletesAndRefuses) {
     const auto text = [](const char* value) { return CimValue::of(CimType::String, std::string(value)); };
     const auto numbers = [](CimType type, std::vector<core::CimScalar> values) {

@@ -184,8 +184,11 @@ Call::Call(const TestBroker& manager, std::string requestedNamespace)
     : broker(manager), nameSpace(std::move(requestedNamespace)) {
     if (currentCall != nullptr) die("a call within a call");
     currentCall = this;
-    const CimValue principal = CimValue::of(CimType::String, "root");
-    context = arguments({{"CMPIPrincipal", principal}}, &broker.contexts).as<cmpi::Context>();
+    const auto text = [](const std::string& value) { return CimValue::of(CimType::String, value); };
+    context =
+        arguments({{"CMPIPrincipal", text("root")}, {"sfcbProviderParameters", text(manager.parameters)}},
+                  &broker.contexts)
+            .as<cmpi::Context>();
     result = make(&broker.results).as<cmpi::Result>();
 }
 

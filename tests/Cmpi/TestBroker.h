@@ -50,6 +50,7 @@ struct Node {
 struct TestBroker {
     explicit TestBroker(Dialect dialect);
     bool isSfcb;
+    std::string parameters = {};  ///< of the registration
     cmpi::Broker broker{};
     cmpi::BrokerTable table{};
     cmpi::BrokerEncTable factories{};
