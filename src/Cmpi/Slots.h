@@ -4,6 +4,7 @@
 #include <string>
 
 #include "Cmpi/Cmpi.h"
+#include "Framework/Model/CimError.h"
 
 /// Calls into the object manager. Real ones leave slots out, state levels that they do not have, and hand
 /// over null where an object should be, so nothing is called before it has been looked at.
@@ -31,7 +32,17 @@ R call(Object* object, R (*Table::*slot)(Self, Parameters...),
     return (object->ft->*slot)(object, arguments...);
 }
 
-/// The same of one of the broker's tables.
+/// Calls a slot whose answer would be taken for a value where there is none. Throws core::CimError there.
+template <class Object, class Table, class R, class Self>
+R read(Object* object, R (*Table::*slot)(Self, Status*)) {
+    Status status{};
+    const bool isThere = object != nullptr && object->ft != nullptr && object->ft->*slot != nullptr;
+    const R answer = isThere ? (object->ft->*slot)(object, &status) : R{};
+    if (isThere && status.rc == ReturnCode::Ok) return answer;
+    throw core::CimError(core::CimStatus::Failed, "the object manager does not tell a value that it gave");
+}
+
+/// Calls a slot of one of the broker's tables.
 template <class Table, class R, class... Parameters>
 R call(const Broker& broker, const Table* table, R (*Table::*slot)(const Broker*, Parameters...),
        std::type_identity_t<Parameters>... arguments) {

@@ -49,8 +49,8 @@ std::string utf8Of(unsigned short unit) {
 
 utils::Time timeOf(const DateTime* time) {
     // As a number, since texts may have an offset from UTC, or asterisks.
-    const auto microseconds = call(time, &DateTimeTable::getBinaryFormat, nullptr);
-    const bool isInterval = call(time, &DateTimeTable::isInterval, nullptr) != 0;
+    const auto microseconds = read(time, &DateTimeTable::getBinaryFormat);
+    const bool isInterval = read(time, &DateTimeTable::isInterval) != 0;
     return isInterval ? utils::Time(microseconds) : utils::Time::fromEpoch(microseconds);
 }
 
@@ -80,8 +80,9 @@ std::int64_t signedOf(CimType type, const Value& value) {
     }
 }
 
-/// Whether the value is a pointer, and null: some object managers say null in this way.
+/// Whether the value is a pointer, and null, or a string without a text: some object managers say null so.
 bool isNullPointer(const Data& data) {
+    if (data.type == kString) return call(data.value.string, &StringTable::getCharPtr, nullptr) == nullptr;
     return ((data.type & kArray) != 0 || data.type >= kInstance) && data.value.string == nullptr;
 }
 
@@ -116,7 +117,7 @@ CimType requireType(Type code) {
 
 CimValue arrayFrom(const Place& place, CimType type, const Array* array) {
     std::vector<CimScalar> elements;
-    const Count size = call(array, &ArrayTable::getSize, nullptr);
+    const Count size = read(array, &ArrayTable::getSize);
     for (Count i = 0; i < size; ++i) {
         Status status{};
         const Data element = call(array, &ArrayTable::getElementAt, i, &status);

@@ -34,12 +34,17 @@ class CmpiHostileTest : public ::testing::TestWithParam<test::Dialect> {
         change(sent);
         return m_front.send(sent).rc;
     }
-    /// How many fail, of each kind one.
+    /// How many fail, of each kind one. What does not is right.
     int failures() const {
         int count = 0;
         for (const Request& request :
-             {m_get, m_work, Request{Op::Instances, m_a, {}, {{"Caption"}}}, Request{Op::References, m_a}})
-            count += send(request) == ReturnCode::Ok ? 0 : 1;
+             {m_get, m_work, Request{Op::Instances, m_a, {}, {{"Caption"}}}, Request{Op::References, m_a}}) {
+            test::Call call(m_front.broker);
+            Sent sent(call, request);
+            const bool isDone = m_front.send(sent).rc == ReturnCode::Ok;
+            EXPECT_TRUE(!isDone || call.answers.called.returnValue == (request.op == Op::Invoke ? 3U : 0U));
+            count += isDone ? 0 : 1;
+        }
         return count;
     }
     int failuresWithout(std::span<void*> slots) {
@@ -60,7 +65,7 @@ class CmpiHostileTest : public ::testing::TestWithParam<test::Dialect> {
                          .path = m_a,
                          .method = "Work",
                          .arguments = {{"Text", CimValue::of(CimType::String, std::string("x"))},
-                                       {"Numbers", CimValue::null(CimType::Uint16, true)}}};
+                                       {"Numbers", CimValue::arrayOf(CimType::Uint16, {std::uint64_t{3}})}}};
 };
 
 INSTANTIATE_TEST_SUITE_P(Manager, CmpiHostileTest, ::testing::ValuesIn(test::kDialects));
@@ -99,13 +104,10 @@ TEST_P(CmpiHostileTest, TestsBitsOfStatesAndRefusesTypesThatItDoesNotTake) {
         const test::Entry key("Number", CimValue::of(type, number));
         return send(m_get, [&](Sent& sent) { sent.path.entries[1] = key; });
     };
-    for (const CimType type : {CimType::Uint8, CimType::Uint16, CimType::Uint64}) {
+    for (const CimType type : {CimType::Uint8, CimType::Uint16, CimType::Uint64, CimType::Sint8,
+                               CimType::Sint16, CimType::Sint64}) {
         EXPECT_EQ(getWithKey(type, std::uint64_t{1}), ReturnCode::Ok);
         EXPECT_NE(getWithKey(type, ~std::uint64_t{0}), ReturnCode::Ok);
-    }
-    for (const CimType type : {CimType::Sint8, CimType::Sint16, CimType::Sint64}) {
-        EXPECT_EQ(getWithKey(type, std::int64_t{1}), ReturnCode::Ok);
-        EXPECT_NE(getWithKey(type, std::int64_t{-1}), ReturnCode::Ok);
     }
     for (const int code : {0x0001, 0x1000, 0x1200, 0x1500, 0x1900, 0x1a00, 0x2001, 0x3000, 0xffff}) {
         const auto type = static_cast<cmpi::Type>(code);
