@@ -37,6 +37,8 @@ std::unique_ptr<core::ProviderSession> openSession() {
     os::openStandardDescriptors();
     const std::string directory = ProviderLibraries::defaultDirectory();
     auto session = std::make_unique<core::ProviderSession>("");
+    // Object managers give a call up after 40 seconds: 5 are more for the whole file, 15 for the adapter.
+    utils::SMASHv2Config::getInstance()->setDefaultImageReadTimeout(std::chrono::seconds(20));
     session->libraries().load(directory);
     for (const ProviderLibraries::Problem& problem : session->libraries().problems())
         QUENX_ERROR("Cannot load %s: %s", problem.file.c_str(), problem.reason.c_str());

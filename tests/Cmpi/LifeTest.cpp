@@ -168,6 +168,7 @@ TEST(CmpiFrontTest, DecidesAboutCleanupOnceUntilThereIsAnotherRequest) {
     EXPECT_EQ(front.cleanup(), " 0 0 0") << "never used";
     const auto identity = CimValue::of(CimType::Reference, front.first("Quenx_SoftwareIdentity"));
     const auto port = CimValue::of(CimType::Reference, front.first("Quenx_EthernetPort"));
+    EXPECT_EQ(config.getInstance()->getImageLimits().silence, std::chrono::seconds(20)) << "calls have 40";
     EXPECT_EQ(front.cleanup(), " 0 0 0");
     EXPECT_EQ(front.cleanup(), " 0 0 0") << "once a class";
     const Request check{.op = Op::Invoke,

@@ -133,6 +133,11 @@ ImageLimits SMASHv2Config::getImageLimits() {
     return readOwnSettings().imageLimits;
 }
 
+void SMASHv2Config::setDefaultImageReadTimeout(std::chrono::seconds silence) {
+    const Mutex::AutoLocker locker(m_ownMutex);
+    m_own.imageLimits.silence = silence;
+}
+
 void SMASHv2Config::initialize() {
     Mutex::AutoLocker locker(m_mutex);
     try {

@@ -61,6 +61,8 @@ class QUENX_EXPORT SMASHv2Config : public AutoSingleton<SMASHv2Config> {
 
     /// How images are read (keys ImageReadTimeout, whole seconds, 1 to 86400, and LargestImage, bytes).
     ImageLimits getImageLimits();
+    /// Gives ImageReadTimeout another value for as long as the file has none, instead of 30 seconds.
+    void setDefaultImageReadTimeout(std::chrono::seconds silence);
 
     static const char* GetSingletonName() { return "SMASHv2Config"; }
     static std::unique_ptr<SMASHv2Config> CreateSingleton();
