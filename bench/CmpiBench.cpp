@@ -30,7 +30,7 @@ class Host {
     }
     std::size_t throughFront() {
         returned = 0;
-        m_front.ask({test::Op::Instances, core::CimPath(kClass, {})});
+        m_front.ask({"instances", core::CimPath(kClass, {})});
         return returned;
     }
     std::size_t inProcess() { return m_requests.enumerateInstances(kClass).size(); }

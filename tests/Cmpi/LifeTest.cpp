@@ -26,7 +26,6 @@ using core::CimPath;
 using core::CimType;
 using core::CimValue;
 using test::LoadedFront;
-using test::Op;
 using test::Request;
 
 /// One adapter, which takes half a second to write to.
@@ -54,7 +53,7 @@ int asChild(const std::function<void()>& body) {
     }
     ::alarm(60);
     body();
-    std::exit(0);  // with all that is loaded
+    std::exit(0);
 }
 
 class CmpiLifeTest : public ::testing::TestWithParam<test::Dialect> {
@@ -91,7 +90,7 @@ class CmpiLifeTest : public ::testing::TestWithParam<test::Dialect> {
         const CimPath job = install(front, uri);
         if (scenario == "exit" || scenario == "unload") {
             m_out << "shutdown:" << front.cleanup(true) << std::endl;
-            if (scenario == "exit") return;
+            if (scenario == "exit") std::exit(0);  // with all that is loaded
         } else {
             follow(front, job, scenario == "delete");
         }
@@ -102,13 +101,15 @@ class CmpiLifeTest : public ::testing::TestWithParam<test::Dialect> {
 
     CimPath install(const LoadedFront& front, const std::string& uri) {
         const Request request{
-            .op = Op::Invoke,
-            .path = front.first("Quenx_SoftwareInstallationService"),
-            .method = "InstallFromURI",
-            .arguments = {{"URI", CimValue::of(CimType::String, uri)},
-                          {"Target", CimValue::of(CimType::Reference, front.first("Quenx_EthernetPort"))},
-                          {"InstallOptions", CimValue::arrayOf(CimType::Uint16, {std::uint64_t{5}})},
-                          {"InstallOptionsValues", CimValue::arrayOf(CimType::String, {})}}};
+            "invoke",
+            front.first("Quenx_SoftwareInstallationService"),
+            {},
+            {},
+            "InstallFromURI",
+            {{"URI", CimValue::of(CimType::String, uri)},
+             {"Target", CimValue::of(CimType::Reference, front.first("Quenx_EthernetPort"))},
+             {"InstallOptions", CimValue::arrayOf(CimType::Uint16, {std::uint64_t{5}})},
+             {"InstallOptionsValues", CimValue::arrayOf(CimType::String, {})}}};
         const core::MethodResult result = front.ask(request).called;
         m_out << "returned " << result.returnValue << std::endl;
         return *result.outputs.at(0).value.get<CimPath>();
@@ -121,16 +122,16 @@ class CmpiLifeTest : public ::testing::TestWithParam<test::Dialect> {
             for (; front.cleanup() == " 50 50 50"; pause(100))
                 ++refusals;
         });
-        const auto state = [&] { return front.ask({Op::Get, job}).instances.at(0).number("JobState"); };
+        const auto state = [&] { return front.ask({"get", job}).instances.at(0).number("JobState"); };
         // The adapter of a deleted job is claimed, and written to, until the flash has ended.
-        if (isDeleted) front.ask({Op::Delete, job});
+        if (isDeleted) front.ask({"delete", job});
         while (!isDeleted && state() < 7)
             pause(20);
         for (const int enough = refusals + 3; refusals < enough;)
             pause(10);
         if (!isDeleted) {
             m_out << "ended with " << state() << std::endl;
-            front.ask({Op::Delete, job});
+            front.ask({"delete", job});
         }
         idleCheck.join();
         m_out << "then:" << front.cleanup() << std::endl;
@@ -171,10 +172,12 @@ TEST(CmpiFrontTest, DecidesAboutCleanupOnceUntilThereIsAnotherRequest) {
     EXPECT_EQ(config.getInstance()->getImageLimits().silence, std::chrono::seconds(20)) << "calls have 40";
     EXPECT_EQ(front.cleanup(), " 0 0 0");
     EXPECT_EQ(front.cleanup(), " 0 0 0") << "once a class";
-    const Request check{.op = Op::Invoke,
-                        .path = front.first("Quenx_SoftwareInstallationService"),
-                        .method = "CheckSoftwareIdentity",
-                        .arguments = {{"Source", identity}, {"Target", port}}};
+    const Request check{"invoke",
+                        front.first("Quenx_SoftwareInstallationService"),
+                        {},
+                        {},
+                        "CheckSoftwareIdentity",
+                        {{"Source", identity}, {"Target", port}}};
     EXPECT_EQ(front.clean(front.instances), " 0");
     // Between the answers to two interfaces: the second one is decided anew.
     EXPECT_EQ(front.ask(check).called.returnValue, 0U);

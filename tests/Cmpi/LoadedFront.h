@@ -7,40 +7,6 @@
 
 namespace test {
 
-/// A request of a client, of any kind.
-enum class Op {
-    Names,
-    Instances,
-    Get,
-    Query,
-    Create,
-    Modify,
-    Delete,
-    Invoke,
-    Associators,
-    AssociatorNames,
-    References,
-    ReferenceNames
-};
-struct Request {
-    Op op = Op::Get;
-    core::CimPath path = {};
-    core::AssociationFilter by = {};
-    core::PropertyFilter filter = {};
-    std::string method = {};
-    std::vector<core::Argument> arguments = {};
-};
-
-/// The objects of a call, which a test may change.
-struct Sent {
-    Sent(Call& its, const Request& asked) : call(its), request(asked) {}
-    Call& call;
-    const Request& request;
-    Node& path = call.path(request.path);
-    Node& in = call.arguments(request.arguments);
-    Node& out = call.arguments({});
-};
-
 /// The front as an object manager loads it; closed at the end of the scope.
 struct LoadedFront {
     LoadedFront(const char* library, Dialect dialect)
@@ -52,16 +18,17 @@ struct LoadedFront {
 
     /// For every class again, as one of the managers does it.
     void create() {
-        const Call call(broker);
+        Call call(broker);
         create(call, "Quenx_Create_InstanceMI", instances);
         create(call, "Quenx_Create_AssociationMI", associations);
         create(call, "Quenx_Create_MethodMI", methods);
     }
     template <class MI>
-    void create(const Call& call, const char* name, MI*& made) const {
+    void create(Call& call, const char* name, MI*& made) const {
         using Create = MI* (*)(const cmpi::Broker*, const cmpi::Context*, cmpi::Status*);
         cmpi::Status status{};
-        made = reinterpret_cast<Create>(dlsym(handle, name))(&broker.broker, call.context, &status);
+        made = reinterpret_cast<Create>(dlsym(handle, name))(&broker.broker, call.context.as<cmpi::Context>(),
+                                                             &status);
     }
     /// The codes of all interfaces, in the manager's order, with a blank before each.
     std::string cleanup(bool isTerminating = false) const {
@@ -72,9 +39,9 @@ struct LoadedFront {
     }
     template <class MI>
     std::string clean(MI* mi, bool isTerminating = false) const {
-        const Call call(broker);
-        return " " +
-               std::to_string(static_cast<int>(mi->ft->cleanup(mi, call.context, isTerminating ? 1 : 0).rc));
+        Call call(broker);
+        const auto answer = mi->ft->cleanup(mi, call.context.as<cmpi::Context>(), isTerminating ? 1 : 0);
+        return " " + std::to_string(static_cast<int>(answer.rc));
     }
     void unload() {
         if (void* const closed = std::exchange(handle, nullptr)) dlclose(closed);
@@ -82,18 +49,14 @@ struct LoadedFront {
 
     /// What the client gets; a failure as CimError. Thread-safe.
     Answers ask(const Request& request, const std::string& nameSpace = "root/cimv2") const {
-        Call call(broker, nameSpace);
-        Sent sent(call, request);
-        Answers answers = call.finish(send(sent));
-        for (const Entry& output : sent.out.entries)
-            answers.called.outputs.push_back({output.name, output.value});
-        return answers;
+        Call call(broker, request, nameSpace);
+        return call.finish(send(call));
     }
     core::CimPath first(const char* className) const {
-        return ask({Op::Names, core::CimPath(className, {})}).paths.at(0);
+        return ask({"names", core::CimPath(className, {})}).paths.at(0);
     }
     /// One call of a function of an MI.
-    cmpi::Status send(Sent& sent) const;
+    cmpi::Status send(Call& call) const;
 
     TestBroker broker;
     void* handle;
@@ -102,42 +65,42 @@ struct LoadedFront {
     cmpi::MethodMI* methods = nullptr;
 };
 
-inline cmpi::Status LoadedFront::send(Sent& sent) const {
+inline cmpi::Status LoadedFront::send(Call& call) const {
     using I = cmpi::InstanceMITable;
     using A = cmpi::AssociationMITable;
-    const Op op = sent.request.op;
+    const auto& [op, path, by, filter, method, arguments] = call.request;
     const auto on = [&](auto* mi, auto function, auto... rest) {
-        const auto* path = sent.path.as<cmpi::ObjectPath>();
-        return (mi->ft->*function)(mi, sent.call.context, sent.call.result, path, rest...);
+        return (mi->ft->*function)(mi, call.context.as<cmpi::Context>(), call.result.as<cmpi::Result>(),
+                                   call.path.as<cmpi::ObjectPath>(), rest...);
     };
     std::vector<const char*> names;
-    for (const std::string& name : sent.request.filter.value_or(std::vector<std::string>{}))
-        names.push_back(sent.call.make(nullptr, name).text.c_str());
+    for (std::size_t i = 0; filter && i < filter->size(); ++i)
+        names.push_back((*filter)[i].c_str());
     names.push_back(nullptr);
-    const char** const list = sent.request.filter ? names.data() : nullptr;
-    if (op == Op::Names) return on(instances, &I::enumerateInstanceNames);
-    if (op == Op::Instances) return on(instances, &I::enumerateInstances, list);
-    if (op == Op::Get) return on(instances, &I::getInstance, list);
-    if (op == Op::Query) return on(instances, &I::execQuery, "select * from Test_Gadget", "WQL");
-    if (op == Op::Create) return on(instances, &I::createInstance, nullptr);
-    if (op == Op::Modify) return on(instances, &I::modifyInstance, nullptr, list);
-    if (op == Op::Delete) return on(instances, &I::deleteInstance);
-    if (op == Op::Invoke)
-        return on(methods, &cmpi::MethodMITable::invokeMethod, sent.request.method.c_str(),
-                  sent.in.as<cmpi::Args>(), sent.out.as<cmpi::Args>());
+    const char** const list = filter ? names.data() : nullptr;
+    if (op == "names") return on(instances, &I::enumerateInstanceNames);
+    if (op == "instances") return on(instances, &I::enumerateInstances, list);
+    if (op == "get") return on(instances, &I::getInstance, list);
+    if (op == "query") return on(instances, &I::execQuery, "select * from Test_Gadget", "WQL");
+    if (op == "create") return on(instances, &I::createInstance, nullptr);
+    if (op == "modify") return on(instances, &I::modifyInstance, nullptr, list);
+    if (op == "delete") return on(instances, &I::deleteInstance);
+    if (op == "invoke")
+        return on(methods, &cmpi::MethodMITable::invokeMethod, method.c_str(), call.in.as<cmpi::Args>(),
+                  call.out.as<cmpi::Args>());
     // Null and empty are both used for what is not given.
     const auto orNull = [](const std::string& text) { return text.empty() ? nullptr : text.c_str(); };
-    const core::AssociationFilter& by = sent.request.by;
     const char* const association = orNull(by.associationClass);
     const char* const result = by.resultClass.c_str();
     const char* const role = orNull(by.role);
     const char* const resultRole = by.resultRole.c_str();
-    if (op == Op::Associators)
+    if (op == "associators")
         return on(associations, &A::associators, association, result, role, resultRole, list);
-    if (op == Op::AssociatorNames)
+    if (op == "associatorNames")
         return on(associations, &A::associatorNames, association, result, role, resultRole);
-    if (op == Op::References) return on(associations, &A::references, result, role, list);
-    return on(associations, &A::referenceNames, result, role);
+    if (op == "references") return on(associations, &A::references, result, role, list);
+    if (op == "referenceNames") return on(associations, &A::referenceNames, result, role);
+    throw std::logic_error("no operation " + op);
 }
 
 }  // namespace test

@@ -98,7 +98,7 @@ Value valueOf(CimType type, const CimScalar& scalar) {
     const TestBroker& broker = now().broker;
     if (const auto* text = std::get_if<std::string>(&scalar)) return {.string = newString(*text)};
     if (const auto* path = std::get_if<core::CimPath>(&scalar))
-        return {.ref = now().path(*path).as<cmpi::ObjectPath>()};
+        return {.ref = now().makePath(*path).as<cmpi::ObjectPath>()};
     if (const auto* time = std::get_if<utils::Time>(&scalar))
         return {.dateTime = make<cmpi::DateTime>(&broker.dateTimes, core::datetimeText(*time))};
     Value value{};  // numbers begin with their lowest byte
@@ -158,8 +158,8 @@ void giveInstance(const Node& instance) {
 }
 
 void giveNumber(const CimValue& value) {
-    now().answers.called.returnValue = static_cast<std::uint32_t>(*value.get<std::uint64_t>());
-    now().answers.called.returnType = value.type;
+    const auto number = static_cast<std::uint32_t>(*value.get<std::uint64_t>());
+    now().answers.called = {number, {}, value.type};
 }
 
 /// Older object managers give the keys, too.
@@ -180,16 +180,19 @@ Entry::Entry(std::string itsName, const CimValue& itsValue, cmpi::State itsState
       state(value.isNull() ? cmpi::kNullValue : itsState),
       type(static_cast<Type>(kCodes[static_cast<int>(value.type)] | (value.isArray ? cmpi::kArray : 0))) {}
 
-Call::Call(const TestBroker& manager, std::string requestedNamespace)
-    : broker(manager), nameSpace(std::move(requestedNamespace)) {
+Call::Call(const TestBroker& manager, Request asked, std::string from)
+    : broker(manager),
+      request(std::move(asked)),
+      nameSpace(std::move(from)),
+      context(makeEntries(&broker.contexts,
+                          {{"CMPIPrincipal", CimValue::of(CimType::String, "root")},
+                           {"sfcbProviderParameters", CimValue::of(CimType::String, broker.parameters)}})),
+      result(make(&broker.results)),
+      path(makePath(request.path)),
+      in(makeEntries(&broker.args, request.arguments)),
+      out(make(&broker.args)) {
     if (currentCall != nullptr) die("a call within a call");
     currentCall = this;
-    const auto text = [](const std::string& value) { return CimValue::of(CimType::String, value); };
-    context =
-        arguments({{"CMPIPrincipal", text("root")}, {"sfcbProviderParameters", text(manager.parameters)}},
-                  &broker.contexts)
-            .as<cmpi::Context>();
-    result = make(&broker.results).as<cmpi::Result>();
 }
 
 Call::~Call() {
@@ -207,18 +210,18 @@ Node& Call::make(const void* table, const std::string& text) {
     return node;
 }
 
-Node& Call::path(const core::CimPath& path) {
-    Node& node = make(&broker.paths, path.getNamespace().empty() ? nameSpace : path.getNamespace());
-    node.className = path.getClassName();
+Node& Call::makePath(const core::CimPath& named) {
+    Node& node = make(&broker.paths, named.getNamespace().empty() ? nameSpace : named.getNamespace());
+    node.className = named.getClassName();
     const cmpi::State state = broker.isSfcb ? 0 : cmpi::kKeyValue;
-    for (const core::CimKey& key : path.getKeys())
+    for (const core::CimKey& key : named.getKeys())
         node.entries.emplace_back(key.name, CimValue::of(kKinds[key.value.index()], key.value), state);
     return node;
 }
 
-Node& Call::arguments(const std::vector<core::Argument>& arguments, const void* table) {
-    Node& node = make(table == nullptr ? &broker.args : table);
-    for (const core::Argument& each : arguments)
+Node& Call::makeEntries(const void* table, const std::vector<core::Argument>& entries) {
+    Node& node = make(table);
+    for (const core::Argument& each : entries)
         node.entries.emplace_back(each.name, each.value);
     return node;
 }
@@ -226,6 +229,8 @@ Node& Call::arguments(const std::vector<core::Argument>& arguments, const void* 
 Answers Call::finish(Status status) {
     const bool isDone = status.rc == ReturnCode::Ok;
     if (answers.done != (isDone ? 1 : 0)) die("returnDone once, after a success");
+    for (const Entry& output : out.entries)
+        answers.called.outputs.push_back({output.name, output.value});
     if (isDone) return std::move(answers);
     const std::string text = status.msg == nullptr ? "" : at(status.msg).text;
     if (answers.error != (broker.isSfcb ? "" : text)) die("a CIM_Error where there are such");
@@ -251,7 +256,7 @@ TestBroker::TestBroker(Dialect dialect) : isSfcb(dialect == Dialect::Sfcb) {
         return instance.as<cmpi::Instance>();
     };
     factories.newObjectPath = [](auto, auto* nameSpace, auto* className, auto) {
-        Node& path = now().path(core::CimPath(className, {}));
+        Node& path = now().makePath(core::CimPath(className, {}));
         path.text = nameSpace;
         return path.as<cmpi::ObjectPath>();
     };

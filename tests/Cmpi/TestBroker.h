@@ -75,23 +75,38 @@ struct Answers {
     std::string error = {};  ///< the message of the CIM_Error
 };
 
+/// A request of a client, by the name of its operation.
+struct Request {
+    std::string op = {};
+    core::CimPath path = {};
+    core::AssociationFilter by = {};
+    core::PropertyFilter filter = {};
+    std::string method = {};
+    std::vector<core::Argument> arguments = {};
+};
+
 /// One call of an MI function, on the thread that makes it. What was made for it dies with it.
 struct Call {
-    explicit Call(const TestBroker& manager, std::string requestedNamespace = "root/cimv2");
+    explicit Call(const TestBroker& manager, Request asked = {}, std::string from = "root/cimv2");
     Call(const Call&) = delete;
     ~Call();
     Node& make(const void* table, const std::string& text = {});
-    Node& path(const core::CimPath& path);
-    Node& arguments(const std::vector<core::Argument>& arguments, const void* table = nullptr);
-    /// Checks the end of a call, and throws its failure as CimError.
+    Node& makePath(const core::CimPath& path);
+    Node& makeEntries(const void* table, const std::vector<core::Argument>& entries);
+    /// Checks the end of the call, and throws its failure as CimError.
     Answers finish(cmpi::Status status);
 
     const TestBroker& broker;
+    const Request request;
     const std::string nameSpace;
-    std::deque<std::unique_ptr<Node>> nodes;
-    const cmpi::Context* context;
-    const cmpi::Result* result;
-    Answers answers;
+    std::deque<std::unique_ptr<Node>> nodes = {};
+    // What the function is given; a test may change it.
+    Node& context;
+    Node& result;
+    Node& path;
+    Node& in;
+    Node& out;
+    Answers answers = {};
 };
 
 }  // namespace test
