@@ -106,7 +106,9 @@ struct AdapterInfo {
     std::vector<NamedVersion> versions = {};  ///< in the driver's order, each name once
     ResetNeeded resetNeeded = ResetNeeded::None;
     std::vector<std::string> interfaces = {};  ///< the network interfaces that run over the port
-    bool isBusy = false;                       ///< somebody is writing to its card, as far as one can tell
+    /// Who is writing to its card, for a person: "process 812 (quenxctl)"; empty where nobody is, as far as
+    /// one can tell.
+    std::string writer = {};
 };
 
 /// Which adapters are wanted. What is left open here, the environment may say; see ma::selectBackend().

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include <chrono>
 #include <cstdint>
 #include <stdexcept>
 #include <string>
@@ -25,6 +26,25 @@ class OperationFailure : public std::runtime_error {
 inline std::uint32_t codeOf(int error) {
     return error <= static_cast<int>(WriteError::DeviceFailed) ? WriteError::DeviceFailed
                                                                : static_cast<std::uint32_t>(error);
+}
+
+/// How long a writer waits for the lock of an adapter or a card: for somebody who looks whether it is free,
+/// not for another update.
+inline constexpr std::chrono::milliseconds kWriterPatience{1000};
+
+/// @param what  "adapter eth0"
+/// @param writer  who is writing to it; see os::FileLock::holder()
+[[noreturn]] inline void refuseAsBusy(const std::string& what, const std::string& writer) {
+    throw OperationFailure(WriteError::Busy,
+                           what + " is being written to by " + writer + "; wait until it is done");
+}
+
+/// For an image that was held against versions which are no longer there: it may be older than what another
+/// process has installed meanwhile.
+[[noreturn]] inline void refuseAsOutdated(const std::string& adapter) {
+    throw OperationFailure(WriteError::Busy, "adapter " + adapter +
+                                                 " has other firmware than when the image was checked: "
+                                                 "somebody else has updated it; check the image again");
 }
 
 /// Runs an operation and turns what it throws into the adapter API's code and text. The log has

@@ -118,10 +118,12 @@ class WatchedFiles : public test::UnsyncedFiles {
         const Rom rom = test::madeRom({{PXE, 9}});
         EXPECT_EQ(0, test::prepareImage("eth0", rom).status);
         const test::WriteResult second = test::writeImage("eth0", rom);
-        EXPECT_EQ("adapter eth0 is being written to by this process (" + std::to_string(::getpid()) +
-                      "); wait until it is done",
+        EXPECT_EQ("adapter eth0 is being written to by process " + std::to_string(::getpid()) +
+                      " (MidApiSimulator); wait until it is done",
                   second.text);
     }
+
+    std::chrono::milliseconds patience() const override { return {}; }
 
     std::string booted = "IMG_PXE 1, IMG_UEFI 0";
     std::vector<std::uint16_t> seen;
@@ -146,6 +148,21 @@ TEST(SimulatorTest, MovesProgressOnlyForward) {
     EXPECT_FALSE(test::writeImage("eth0", prepared.image).done);
     EXPECT_NEAR(54, ma::getFlashImageUpdateProgress("eth0"), 5);
     EXPECT_TRUE(test::writeImage("eth0", prepared.image).done);
+}
+
+TEST(SimulatorTest, WritesOnlyOverTheFirmwareThatAnImageWasHeldAgainst) {
+    const test::SimulatedAdapters adapters;
+    const test::PreparedImage prepared = test::prepareImage("eth0", test::madeRom({{PXE, 2}}));
+    // Another process.
+    ma::Simulator other(ma::loadAdapterDescriptions(adapters.descriptionFile()), adapters.stateDirectory());
+    const Rom newer = test::madeRom({{PXE, 3}});
+    std::uint32_t code = 0;
+    std::string text;
+    EXPECT_TRUE(
+        other.writeFlashImage("eth0", newer.data(), static_cast<std::uint32_t>(newer.size()), code, text));
+    const test::WriteResult refused = test::writeImage("eth0", prepared.image);
+    EXPECT_EQ(ma::WriteError::Busy, refused.code);
+    EXPECT_EQ("IMG_PXE 3, IMG_UEFI 0", test::componentsOf("eth0"));
 }
 
 }  // namespace

@@ -233,7 +233,8 @@ TEST_P(DaemonSessionTest, ShowsWhatIsWrittenDown) {
 }
 
 INSTANTIATE_TEST_SUITE_P(Shell, DaemonSessionTest,
-                         ::testing::Values("Interop", "Remote", "SameModel", "SecondDaemon", "Update"),
+                         ::testing::Values("Held", "Interop", "Remote", "SameModel", "SecondDaemon",
+                                           "TwoFronts", "Update"),
                          [](const auto& session) { return std::string(session.param); });
 
 }  // namespace

@@ -35,20 +35,6 @@ class RemoteTest : public test::Quenxctl {
     const std::string m_flash = m_daemon.folder() / "state/eth0";
 };
 
-TEST_F(RemoteTest, SaysWhoHoldsTheAdapters) {
-    test::HeldFlash held(m_flash);
-    Program first(command(kInstall));
-    ASSERT_TRUE(held.isWaitedFor());
-    expectError(kInstall, 1, "eth0 is being updated (Quenx:FirmwareUpdate@Job#1, ");
-    expectError("install --target eth1 IMAGE", 1, "eth0 is being updated (Quenx:FirmwareUpdate@Job#1, ");
-    expectOutput("delete Quenx:FirmwareUpdate@Job#1", "Its update continues, but can no longer be followed");
-    EXPECT_TRUE(contains(first.finish().error, "it was deleted"));
-    expectError(kInstall, 1,
-                "The server refuses eth0, although no job is running: an earlier check may hold it, or ");
-    expectError("install --target eth1 IMAGE", 1,
-                "or another adapter than eth1 is in use: an earlier check may hold it, or ");
-}
-
 /// Whether the program comes to handle the signal itself.
 bool handles(const Program& program, int signal) {
     for (int round = 0; round < 1000; ++round) {

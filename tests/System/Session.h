@@ -31,7 +31,7 @@ inline void expectSession(const std::string& name, const TempFolder& folder, con
         }
         if (!command.empty()) {
             const ProgramResult result =
-                run({"/bin/sh", "-c", "cd \"$0\"; eval \"$1\" 2>&1", folder.path(), programs + command},
+                run({"/bin/sh", "-c", "exec 2>&1; cd \"$0\"; eval \"$1\"", folder.path(), programs + command},
                     {"PATH=" QUENX_PROGRAMS ":/usr/bin:/bin"});
             const std::string shown =
                 result.out + (result.status == 0 ? "" : "[" + std::to_string(result.status) + "]\n");

@@ -137,6 +137,7 @@ void to_json(Json& json, const Adapter& adapter) {
             {"interfaces", adapter.interfaces},
             {"updatable", adapter.updatable},
             {"busy", adapter.busy},
+            {"writer", adapter.writer},
             {"components", adapter.components},
             {"resetNeeded", adapter.resetNeeded},
             {"path", adapter.path},
@@ -181,6 +182,7 @@ void readMore(Adapter& adapter, const core::InstanceValue& port) {
     adapter.interfaces = identifyingTexts(port, "Network Interface");
     adapter.resetNeeded = resetNeededOf(port);
     adapter.busy = identifyingText(port, "Update State") == "Busy";
+    adapter.writer = identifyingText(port, "Updating Process");
 }
 
 }  // namespace

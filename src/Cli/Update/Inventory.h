@@ -53,6 +53,7 @@ struct Adapter {
     std::vector<std::string> interfaces = {};
     std::string resetNeeded = {};  ///< "none", "reload", "reboot", "power cycle", "unknown"
     bool busy = false;             ///< somebody is writing to its card
+    std::string writer = {};       ///< who, as the service tells it: "process 812 (quenxctl)"
 
     /// It has new firmware that does not run yet; false where the adapter does not tell.
     bool waitsForReset() const;

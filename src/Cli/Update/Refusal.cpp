@@ -79,7 +79,7 @@ Reason explainHiddenHolder(std::uint32_t returnValue, const Candidate& candidate
 }
 
 /// Who holds the adapter. If the service is busy with another adapter, it answers as it does for an image
-/// that it cannot read. In process, nobody else can hold it.
+/// that it cannot read. In process, no other client can.
 Reason explainHolder(const Connection& connection, std::uint32_t returnValue, const Candidate& candidate) {
     const bool mayBeHeld =
         returnValue == MethodReturn::InUse || returnValue == MethodReturn::UnspecifiedError;
@@ -91,6 +91,14 @@ Reason explainHolder(const Connection& connection, std::uint32_t returnValue, co
                                job.id + (percent ? ", " + std::to_string(*percent) + " % done" : "") +
                                "). The server updates one adapter at a time.",
                            "Try again when that update has ended; \"quenxctl jobs\" shows its progress."};
+    }
+    // Looked at anew: the update may have begun since, of another process or of a job that was deleted.
+    const Adapter now = findAdapter(connection, candidate.adapter.name);
+    if (now.busy) {
+        return Explanation{now.name + " is being written to by " +
+                               (now.writer.empty() ? "another process" : now.writer) +
+                               ", on the server's machine.",
+                           "Try again when that process is done."};
     }
     return explainHiddenHolder(returnValue, candidate);
 }
@@ -247,10 +255,15 @@ Reason explainImage(const Connection& connection, std::uint32_t returnValue, con
 }
 
 /// Says that the old firmware is still there only when what was read back shows it.
-std::string readBackText(const Candidate& candidate, const std::vector<Component>& after) {
+std::string readBackText(const Candidate& candidate, const std::vector<Component>& after, bool isBusy) {
     const std::vector<Component>& before = candidate.adapter.components;
     if (after.empty() || before.empty()) return {};
     if (after != before) return "It now has " + componentsText(after) + ".";
+    // Somebody else may change them at any moment.
+    if (isBusy) {
+        return "This update left its firmware as it was. While somebody else writes to it, \"quenxctl "
+               "adapters\" shows it as busy.";
+    }
     // If the image has the versions that were there, reading them back shows nothing.
     const bool isTelling = candidate.comparison && !candidate.comparison->current;
     return isTelling ? "It keeps its old firmware." : "It reports the same versions as before.";
@@ -282,7 +295,7 @@ Explanation explainRefusal(const Connection& connection, std::uint32_t returnVal
 Explanation explainFailedJob(const Connection& connection, const JobView& job, const Candidate& candidate,
                              const std::vector<Component>& after) {
     const std::string reason = job.errorDescription.empty() ? "no reason was given" : job.errorDescription;
-    std::string next = readBackText(candidate, after);
+    std::string next = readBackText(candidate, after, job.errorCode == ma::WriteError::Busy);
     // Of its own format a backend says itself what it takes.
     const bool mayBeFiles = connection.isInProcess && !candidate.verdict;
     const std::string advice = mayBeFiles ? permissionAdvice(reason) : "";

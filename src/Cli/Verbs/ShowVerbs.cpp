@@ -81,6 +81,12 @@ bool isFirmwareUnknown(const Adapter& adapter) {
     return !adapter.answers || (adapter.busy && adapter.components.empty());
 }
 
+void tellWriters(Context& context, const std::vector<Adapter>& adapters) {
+    for (const Adapter& adapter : adapters)
+        if (adapter.busy && !adapter.writer.empty())
+            context.error << printable(adapter.name + " is being written to by " + adapter.writer) << ".\n";
+}
+
 std::vector<std::string> silentOnes(const std::vector<Adapter>& adapters) {
     std::vector<std::string> names;
     for (const Adapter& adapter : adapters)
@@ -143,6 +149,7 @@ ExitStatus showAdapters(Context& context, const VerbOptions& options) {
                         adapter.description});
     }
     printTable(context.out, rows);
+    tellWriters(context, adapters);
     // Why that is so is the next question.
     if (std::ranges::none_of(adapters, &Adapter::updatable)) {
         const std::string advice = adviceForNoAdapters(context.connection);

@@ -8,10 +8,17 @@
 #include "MidAPI/Devlink/Activator.h"
 #include "MidAPI/Devlink/CardLock.h"
 #include "Utils/Log.h"
+#include "Utils/Os/Linux/LockHolder.h"
 
 namespace ma::devlink {
 
 using utils::Mutex;
+
+namespace {
+
+constexpr const char* kSomebody = "another process";
+
+}  // namespace
 
 AdapterTable::AdapterTable(std::shared_ptr<Machine> machine, std::string lockFolder)
     : m_machine(std::move(machine)), m_lockFolder(std::move(lockFolder)) {}
@@ -54,6 +61,9 @@ std::optional<KnownFunction> AdapterTable::find(const std::string& name, Ask ask
         found = look(name);
     }
     if (!found) return std::nullopt;
+    // The kernel tells that somebody is flashing it, but not who.
+    if (found->known.writer == kSomebody)
+        if (auto holder = findLockHolder(found->known.pci); !holder.empty()) found->known.writer = holder;
     if (!found->mustBeAsked) return found->known;
     if (ask != Ask::AnewAsHolder) found->known.writer = findLockHolder(found->known.pci);
     if (!found->known.writer.empty() || ask == Ask::Never) return found->known;
@@ -73,8 +83,8 @@ std::optional<AdapterTable::Found> AdapterTable::look(const std::string& name) {
     if (entry == m_entries.end()) return std::nullopt;
     const auto& [known, isOutOfDate, isFlashedElsewhere, ownFlashes, changes] = entry->second;
     Found found{known, isOutOfDate, changes};
-    if (isFlashedElsewhere) found.known.writer = "another process";
-    if (ownFlashes > 0) found.known.writer = "this process";
+    if (isFlashedElsewhere) found.known.writer = kSomebody;
+    if (ownFlashes > 0) found.known.writer = os::describeThisProcess();
     if (!found.known.writer.empty()) found.mustBeAsked = false;
     return found;
 }
@@ -209,7 +219,7 @@ void AdapterTable::outdate(Entry& entry) {
 }
 
 /// Another process of this product may have been flashing the card before this one began to listen. While
-/// somebody holds it, there is his number in the lock's file; who may not read it may not flash, either.
+/// somebody holds it, there is his note in the lock's file; who may not read it may not flash, either.
 std::string AdapterTable::findLockHolder(const PciFunction& function) try {
     const std::string path = CardLock::path(m_lockFolder, function);
     if (m_machine->readFile(path).value_or("").empty()) return {};

@@ -23,7 +23,6 @@ namespace {
 
 // The packages' state folder, where a hardened daemon may write, too.
 constexpr const char* kLockFolder = "/var/lib/quenx/locks";
-constexpr std::chrono::milliseconds kLockPatience{3000};
 // What was prepared is written at once; what was not by then was only checked.
 constexpr std::chrono::seconds kPreparationPending{30};
 
@@ -34,11 +33,6 @@ std::string unknown(const std::string& adapter) {
 /// Whether no process could flash it, whatever its rights.
 bool canNeverBeUpdated(const FlashVerdict& flash) {
     return flash.flashable == Flashable::NotOffered || flash.flashable == Flashable::Absent;
-}
-
-[[noreturn]] void refuseAsBusy(const std::string& what, const std::string& writer) {
-    throw OperationFailure(WriteError::Busy,
-                           what + " is being written to by " + writer + "; wait until it is done");
 }
 
 /// An answer that a file cannot change.
@@ -125,7 +119,7 @@ int DevlinkBackend::prepareFlashImage(const std::string& adapter, const std::uin
     if (!verdict.reason.empty())
         QUENX_ERROR("adapter %s: status %d: %s", adapter.c_str(), verdict.status, verdict.reason.c_str());
     if (!hasOutput(verdict.status)) return verdict.status;
-    remember(adapter, buffers->file, verdict.components);
+    remember(*known, buffers->file, verdict.components);
     *imageSize = buffers->copyFile();
     types = verdict.types;
     return verdict.status;
@@ -139,16 +133,16 @@ bool DevlinkBackend::Prepared::isOf(std::span<const std::uint8_t> image) const {
 }
 
 /// The write is told the bytes alone, so these must not mean two things at a time.
-void DevlinkBackend::remember(const std::string& adapter, std::span<const std::uint8_t> image,
+void DevlinkBackend::remember(const KnownFunction& known, std::span<const std::uint8_t> image,
                               const std::vector<std::string>& components) {
     const auto now = std::chrono::steady_clock::now();
     const utils::Mutex::AutoLocker lock(m_preparedMutex);
-    Prepared& prepared = m_prepared[adapter];
+    Prepared& prepared = m_prepared[known.pci.address];
     if (now < prepared.end && prepared.components != components && prepared.isOf(image))
         throw OperationFailure(WriteError::Busy,
                                "the same image was just prepared for other image types and is about to be "
                                "written; try again in half a minute");
-    prepared = {image.size(), crc32(image), components, now + kPreparationPending};
+    prepared = {image.size(), crc32(image), components, known.info.versions, now + kPreparationPending};
 }
 
 PackageVerdict DevlinkBackend::assess(const KnownFunction& known, std::span<const std::uint8_t> file,
@@ -191,12 +185,17 @@ bool DevlinkBackend::writeFlashImage(const std::string& adapter, const std::uint
 void DevlinkBackend::write(const std::string& adapter, std::span<const std::uint8_t> image) {
     const auto known = m_table.find(adapter, AdapterTable::Ask::Anew);
     if (!known) throw OperationFailure(WriteError::UnknownAdapter, unknown(adapter));
-    const std::vector<std::string> components = takePrepared(adapter, image);
+    const Prepared prepared = takePrepared(adapter, image);
     // Said before the lock is tried, which takes rights of its own.
     if (known->flash.flashable != Flashable::Unknown) requireFlashable(*known);
-    const CardLock lock(*m_machine, kLockFolder, known->pci, known->info, kLockPatience);
+    const CardLock lock(*m_machine, kLockFolder, known->pci, known->info, kWriterPatience);
     if (!lock.isHeld()) refuseAsBusy("the card of adapter " + adapter, lock.holder());
-    const FlashOrder order{readUnderLock(adapter), stagingFolder(), image, components};
+    const FlashOrder order{readUnderLock(adapter), stagingFolder(), image, prepared.components};
+    // What the driver does not tell now is no other version.
+    const std::vector<NamedVersion>& installed = order.function.info.versions;
+    const bool isTold = order.function.infoError.empty() && !installed.empty();
+    if (prepared.heldAgainst && isTold && *prepared.heldAgainst != installed) refuseAsOutdated(adapter);
+    forgetVersions(adapter);
     const AdapterTable::FlashScope flashing(m_table, adapter);
     const WritingScope writing(*order.function.progress);
     runFlash(*m_machine, order, [this] { m_table.readNotifications(); });
@@ -219,7 +218,7 @@ std::string DevlinkBackend::stagingFolder() try {
     throw OperationFailure(EACCES, error.what());
 }
 
-std::vector<std::string> DevlinkBackend::takePrepared(const std::string& adapter,
+DevlinkBackend::Prepared DevlinkBackend::takePrepared(const std::string& adapter,
                                                       std::span<const std::uint8_t> image) {
     const utils::Mutex::AutoLocker lock(m_preparedMutex);
     const auto found = m_prepared.find(adapter);
@@ -227,7 +226,13 @@ std::vector<std::string> DevlinkBackend::takePrepared(const std::string& adapter
         throw OperationFailure(WriteError::BadImage,
                                "this image was not prepared for adapter " + adapter + "; prepare it first");
     found->second.end = {};
-    return found->second.components;
+    return found->second;
+}
+
+/// What this process writes itself is no surprise to it.
+void DevlinkBackend::forgetVersions(const std::string& adapter) {
+    const utils::Mutex::AutoLocker lock(m_preparedMutex);
+    m_prepared[adapter].heldAgainst.reset();
 }
 
 bool DevlinkBackend::updateCapabilityWord(const std::string& adapter, const std::vector<utils::FirmwareType>&,
@@ -269,7 +274,7 @@ AdapterInfo DevlinkBackend::getAdapterInfo(const std::string& adapter) {
         version.type = m_settings.components.typeOf(version.name);
     info.resetNeeded = resetNeeded(known);
     info.interfaces = known.pci.interfaces;
-    info.isBusy = !known.writer.empty();
+    info.writer = known.writer;
     info.description = "Ethernet adapter " + known.pci.address;
     return info;
 }
@@ -329,7 +334,7 @@ Activation DevlinkBackend::activate(const std::string& adapter, const Activation
     if (!request.mayDisrupt && !use.losses.empty())
         return {Activation::WouldDisrupt, utils::joined(use.losses, "; ")};
     if (known.flash.flashable == Flashable::NotPermitted) return {Activation::Failed, known.flash.reason};
-    const CardLock lock(*m_machine, kLockFolder, known.pci, known.info, kLockPatience);
+    const CardLock lock(*m_machine, kLockFolder, known.pci, known.info, kWriterPatience);
     if (!lock.isHeld()) refuseAsBusy("the card", lock.holder());
     const std::string flashed = m_table.findFlashedElsewhere(known);
     if (!flashed.empty()) refuseAsBusy("function " + flashed + " of the card", "another program");

@@ -59,6 +59,8 @@ class QUENX_EXPORT DevlinkBackend : public Backend {
         std::size_t size = 0;
         std::uint32_t checksum = 0;
         std::vector<std::string> components;
+        /// The card's versions then. Empty once this process has written to it.
+        std::optional<std::vector<NamedVersion>> heldAgainst;
         std::chrono::steady_clock::time_point end;  ///< until then the write is expected
 
         bool isOf(std::span<const std::uint8_t> image) const;
@@ -68,12 +70,13 @@ class QUENX_EXPORT DevlinkBackend : public Backend {
     PackageVerdict assess(const KnownFunction& known, std::span<const std::uint8_t> file,
                           const std::vector<utils::FirmwareType>& types);
     bool accepts(const KnownFunction& known, const std::string& component);
-    void remember(const std::string& adapter, std::span<const std::uint8_t> image,
+    void remember(const KnownFunction& known, std::span<const std::uint8_t> image,
                   const std::vector<std::string>& components);
     void write(const std::string& adapter, std::span<const std::uint8_t> image);
     KnownFunction readUnderLock(const std::string& adapter);
     std::string stagingFolder();
-    std::vector<std::string> takePrepared(const std::string& adapter, std::span<const std::uint8_t> image);
+    Prepared takePrepared(const std::string& adapter, std::span<const std::uint8_t> image);
+    void forgetVersions(const std::string& adapter);
 
     const Settings m_settings;
     const std::shared_ptr<Machine> m_machine;

@@ -7,15 +7,17 @@
 #include <stdexcept>
 
 #include "MidAPI/Image/Bytes.h"
-#include "MidAPI/Simulator/Fault.h"
+#include "MidAPI/OperationFailure.h"
 #include "Utils/Log.h"
 #include "Utils/Os/Linux/OwnFiles.h"
+#include "Utils/Os/Linux/linux.h"
 
 namespace ma {
 namespace {
 
 // As the record of an old backup does.
 constexpr const char* kFitsNoBank = "fits neither bank";
+constexpr const char* kWritersLock = "flash.lock";
 constexpr std::size_t kChunk = 4096;  // a sector of the flash
 
 /// An open file of FlashFiles, closed with the scope.
@@ -91,7 +93,17 @@ std::vector<std::uint8_t> FlashStore::content() const {
 
 os::FileLock FlashStore::lockForWriting() {
     makeFolders();
-    return os::FileLock(m_folder.file("flash.lock"));
+    return os::FileLock(m_folder.file(kWritersLock), std::min(m_files->patience(), kWriterPatience));
+}
+
+std::string FlashStore::writer() const try {
+    const std::string path = m_folder.file(kWritersLock);
+    // Whoever writes has left a note there, so nobody takes the lock of an adapter that is free.
+    if (os::readSystemText(path, 1).value_or("").empty()) return {};
+    const os::FileLock lock(path);
+    return lock.isHeld() ? "" : lock.holder();
+} catch (const std::runtime_error&) {
+    return {};
 }
 
 void FlashStore::write(std::span<const std::uint8_t> image, const std::function<void(std::size_t)>& reached) {

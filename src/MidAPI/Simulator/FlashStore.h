@@ -42,6 +42,8 @@ class FlashStore {
 
     /// The right to write an image, for as long as the result lives; see os::FileLock::isHeld().
     os::FileLock lockForWriting();
+    /// Who has that right, for a person. Empty where nobody has it, and for who may not take it himself.
+    std::string writer() const;
 
     /// Writes an image into the bank that is not booted, then makes it the one that is. `reached` is called
     /// with the bytes written so far, first with 0; an exception from it leaves the adapter with the old

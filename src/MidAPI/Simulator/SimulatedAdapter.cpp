@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "MidAPI/Simulator/SimulatedAdapter.h"
 
+#include <algorithm>
 #include <chrono>
 #include <stdexcept>
 #include <system_error>
@@ -174,6 +175,10 @@ PrepareStatus SimulatedAdapter::prepareOrThrow(const ImageBuffers& buffers, std:
         QUENX_ERROR("simulated adapter %s: status %d: %s", m_description.name.c_str(), preparation.status,
                     preparation.reason.c_str());
     if (!hasOutput(preparation.status)) return preparation.status;
+    {
+        const utils::Mutex::AutoLocker lock(m_cacheMutex);
+        m_heldAgainst = target.components;
+    }
     imageSize = static_cast<std::uint32_t>(composeChosen(preparation, buffers.file, buffers.output));
     types = preparation.types;
     return preparation.status;
@@ -198,12 +203,23 @@ bool SimulatedAdapter::write(std::span<const std::uint8_t> image, std::uint32_t&
         // What can be refused without the lock is: a second writer then reads what is wrong, not "busy".
         requireWritable(image);
         const os::FileLock lock = m_store.lockForWriting();
-        if (!lock.isHeld())
-            throw OperationFailure(WriteError::Busy, "adapter " + m_description.name +
-                                                         " is being written to by " + lock.holder() +
-                                                         "; wait until it is done");
+        if (!lock.isHeld()) refuseAsBusy("adapter " + m_description.name, lock.holder());
+        requireUnchanged();
         writeLocked(image);
     });
+}
+
+/// The caller holds the writing lock.
+void SimulatedAdapter::requireUnchanged() {
+    const std::vector<utils::FirmwareVersionInfo> installed = components();
+    const utils::Mutex::AutoLocker lock(m_cacheMutex);
+    const auto isSame = [](const auto& left, const auto& right) {
+        return left.type == right.type && left.version == right.version;
+    };
+    if (m_heldAgainst && !std::ranges::equal(*m_heldAgainst, installed, isSame))
+        refuseAsOutdated(m_description.name);
+    // What this process writes itself is no surprise to it.
+    m_heldAgainst.reset();
 }
 
 void SimulatedAdapter::writeLocked(std::span<const std::uint8_t> image) {
@@ -261,7 +277,8 @@ AdapterInfo SimulatedAdapter::info() {
                 .linkUp = m_description.linkUp,
                 .ids = m_description.ids,
                 .components = components(),
-                .description = m_description.description};
+                .description = m_description.description,
+                .writer = m_store.writer()};
     } catch (const std::runtime_error& failure) {
         throw AdapterError("adapter " + m_description.name + ": " + failure.what());
     }

@@ -46,6 +46,7 @@ class SimulatedAdapter {
   private:
     std::vector<utils::FirmwareVersionInfo> components();
     void requireWritable(std::span<const std::uint8_t> image) const;
+    void requireUnchanged();
     void writeLocked(std::span<const std::uint8_t> image);
     PrepareStatus prepareOrThrow(const ImageBuffers& buffers, std::uint32_t& imageSize,
                                  std::vector<utils::FirmwareType>& types);
@@ -62,6 +63,8 @@ class SimulatedAdapter {
     };
     utils::Mutex m_cacheMutex;
     std::optional<Cache> m_cache QUENX_GUARDED_BY(m_cacheMutex);
+    /// What was installed when the image was prepared that is to be written next.
+    std::optional<std::vector<utils::FirmwareVersionInfo>> m_heldAgainst QUENX_GUARDED_BY(m_cacheMutex);
 };
 
 }  // namespace ma

@@ -22,7 +22,8 @@ void addTold(std::vector<Identification>& rows, const ma::AdapterInfo& info) {
     add("Board Serial Number", info.boardSerialNumber);
     for (const ma::NamedVersion& version : info.versions)
         add(version.name, version.fixed);
-    if (info.isBusy) add("Update State", "Busy");
+    if (!info.writer.empty()) add("Update State", "Busy");
+    add("Updating Process", info.writer);
     if (info.resetNeeded != ma::ResetNeeded::None) add("Reset Needed", resetText(info.resetNeeded));
 }
 

@@ -124,7 +124,7 @@ void expectAnswersFromMemory(const test::DevlinkBench& bench, bool isKnown) {
     const int asked = bench.kernel->requests;
     EXPECT_EQ(2U, ma::enumerateAdapters().size());
     EXPECT_TRUE(ma::getCanBeUpdated(bench.first));
-    EXPECT_TRUE(ma::getAdapterInfo(bench.first).isBusy);
+    EXPECT_THAT(ma::getAdapterInfo(bench.first).writer, testing::HasSubstr("process"));
     EXPECT_EQ(isKnown ? "1.2.3" : "", runningVersion(bench.first));
     EXPECT_GT(100, ma::getFlashImageUpdateProgress(bench.first));
     EXPECT_EQ(5, ma::getPCIAddress(bench.first).bus);
@@ -143,6 +143,12 @@ TEST(DevlinkInventoryTest, NeverAsksADeviceThatIsBeingFlashed) {
     bench.kernel->notify(DEVLINK_CMD_FLASH_UPDATE, bench.first);
     bench.kernel->notify(DEVLINK_CMD_NEW, bench.second);
     expectAnswersFromMemory(bench, true);
+    EXPECT_EQ("another process", ma::getAdapterInfo(bench.first).writer) << "which takes no lock";
+    {
+        const auto lock = bench.kernel->lock("/var/lib/quenx/locks/0000:05:00.lock", {});
+        EXPECT_EQ("process " + std::to_string(::getpid()) + " (MidApiDevlinkTe)",
+                  ma::getAdapterInfo(bench.first).writer);
+    }
     bench.device().running["fw"] = "1.3.0";
     bench.kernel->notify(DEVLINK_CMD_FLASH_UPDATE_END, bench.first);
     EXPECT_EQ("1.3.0", runningVersion(bench.first));
@@ -153,7 +159,8 @@ TEST(DevlinkInventoryTest, NeverAsksADeviceThatIsBeingFlashed) {
         const auto lock = bench.kernel->lock("/var/lib/quenx/locks/0000:05:00.lock", {});
         expectAnswersFromMemory(bench, false);
         EXPECT_THAT(ma::describeSearch(),
-                    testing::HasSubstr(bench.first + " (fake) is being written to by this process ("));
+                    testing::HasSubstr(bench.first + " (fake) is being written to by process " +
+                                       std::to_string(::getpid()) + " ("));
         EXPECT_EQ(ma::PrepareStatus::UnspecifiedError, bench.prepare());
     }
     EXPECT_TRUE(ma::getCanBeUpdated(bench.first));

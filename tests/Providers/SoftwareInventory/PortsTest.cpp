@@ -99,16 +99,18 @@ TEST_F(PortsTest, TellWhatTheirDriverTells) {
             {.name = "fw.undi", .running = "v1 beta", .stored = "v1 beta", .type = utils::FirmwareType::PXE}};
         info.resetNeeded = ma::ResetNeeded::PowerCycle;
         info.interfaces = {"ens1", "ens2"};
-        info.isBusy = true;
+        info.writer = "process 8 (x)";
     };
     EXPECT_EQ(table("Quenx_EthernetPort", {"OtherIdentifyingInfo"}).front(),
-              "03:00.0,1af4:1041,1af4:1041,Supported,devlink,fastnic,S1,B1,K12,Busy,Power Cycle,ens1,ens2");
+              "03:00.0,1af4:1041,1af4:1041,Supported,devlink,fastnic,S1,B1,K12,Busy,process 8 (x),Power "
+              "Cycle,ens1,ens2");
     EXPECT_EQ(table("Quenx_EthernetPort", {"IdentifyingDescriptions"}).front(),
               "PCI Address,PCI Vendor and Device ID,PCI Subsystem Vendor and Device ID,Firmware Update,"
-              "Adapter Backend,Driver,Serial Number,Board Serial Number,board.id,Update State,Reset Needed,"
+              "Adapter Backend,Driver,Serial Number,Board Serial Number,board.id,Update State,Updating "
+              "Process,Reset Needed,"
               "Network Interface,Network Interface");
     EXPECT_EQ(table("Quenx_PortController", {"OtherIdentifyingInfo"}).front(),
-              "03:00,1af4:1041,1af4:1041,Supported,devlink,fastnic,S1,B1,K12,Busy,Power Cycle");
+              "03:00,1af4:1041,1af4:1041,Supported,devlink,fastnic,S1,B1,K12,Busy,process 8 (x),Power Cycle");
 
     // One identity for what runs, and one behind it for what waits. The texts stay, beside the numbers.
     Rows identities = table("Quenx_SoftwareIdentity",

@@ -30,13 +30,11 @@ class QUENX_EXPORT FileLock {
     /// False in a child that was forked since.
     bool isHeld() const { return m_held && m_process == ::getpid(); }
 
-    /// Who holds the lock that this one did not get, for a person: "process 812 (quenxctl)", "this process
-    /// (812)" or, where the system does not tell, "another process".
+    /// Who holds the lock that this one did not get, for a person; see describeLockHolder().
     std::string holder() const;
 
   private:
-    pid_t holdingProcess() const;
-    void leaveProcessId() const;
+    void leaveNote() const;
 
     const Descriptor m_file;
     bool m_held = false;

@@ -21,8 +21,21 @@ TEST(FileLockTest, TellsWhoHoldsIt) {
     {
         const os::FileLock held(path);
         EXPECT_TRUE(held.isHeld());
+        const std::string space = std::filesystem::read_symlink("/proc/self/ns/pid");
+        const std::string self = "process " + std::to_string(::getpid());
         const auto left = test::readTestFile(path);
-        EXPECT_EQ(std::string(left.begin(), left.end()), std::to_string(::getpid()) + "\n");
+        const std::string note(left.begin(), left.end());
+        EXPECT_TRUE(note.starts_with(std::to_string(::getpid()) + " ") &&
+                    note.ends_with(" " + space + " UtilsTest\n"))
+            << note;
+        EXPECT_EQ(os::FileLock(path).holder(), self + " (UtilsTest)");
+        // The number is of a process that began at another time, then of none that the kernel names.
+        folder.write("lock", std::to_string(::getpid()) + " 1 " + space + " old\x1b[m\n");
+        EXPECT_EQ(os::FileLock(path).holder(), "a child that " + self + " (old[m) left behind");
+        for (const std::string& forged : {"1 1 " + space + " init\n", std::string("-1 1 x\n"), self}) {
+            folder.write("lock", forged);
+            EXPECT_EQ(os::FileLock(path).holder(), self + " (UtilsTest)") << forged;
+        }
     }
     EXPECT_TRUE(test::readTestFile(path).empty()) << "nobody holds it any more";
 
