@@ -12,6 +12,7 @@
 #include "Providers/Schema/ProviderInterfaces.h"
 #include "Providers/SoftwareUpdate/UpdateTest.h"
 #include "Support/TestRoms.h"
+#include "Utils/Utils.h"
 
 namespace {
 
@@ -137,34 +138,15 @@ TEST_F(MethodsTest, AnswerEachCallWithItsValueLineJobAndClaim) {
 }
 
 TEST_F(MethodsTest, DecideByTheStatusOfThePreparation) {
-    const std::string downgrade =
-        "EDowngradeDetected:Downgrade was detected for <good>. Try to use FORCE_INSTALL option.";
-    const std::string types =
-        "EDowngradeDetected:The selected flash image cannot be used because it does not contain the same "
-        "image types. Please select a flash file with matching image types.";
-    const Codes forced{5, 3};
-    const char* const ban = "OEMCustomizeable=5\n";
-    const std::tuple<int, Codes, const char*, std::uint32_t, Texts> table[] = {
-        {1, forced, "", 5, {"EInvalidParameter:Invalid parameter detected for <good>"}},
-        {2, forced, "", 4097, {"EAdapterNotSupported:Image <good> is not supported for adapter eth0"}},
-        {3, {5}, "", 4099, {downgrade}},
-        {3, forced, ban, 4096, {}},
-        {4, {5}, "", 4099, {downgrade}},
-        {4, forced, "", 4096, {}},
-        {4, forced, ban, 4099, {types}},
-        {4, {5}, ban, 4099, {types}},
-        {5, forced, "", 4106, {"Not applicable for target for '<eth0>' "}},
-        {6, forced, "", 2, {"EUnspecifiedError:Unspecified error occurred for <good>"}},
-        {7, {5}, "", 4096, {}},
-        {-1, {5}, "", 4096, {}},
-    };
-    for (const auto& [status, options, policy, returnValue, lines] : table) {
-        const utils::SMASHv2Config config(m_folder.write("policy.conf", policy));
-        m_backend->prepareStatus = status;
-        Texts row{kInstall + (options == forced ? "5,3" : "5"), std::to_string(returnValue)};
-        row.insert(row.end(), lines.begin(), lines.end());
+    for (Texts row : test::readTestTable(QUENX_UPDATE_SAMPLES "/statuses")) {
+        const Texts words = utils::split(row[0], ' ');
+        const Codes options = words.at(1) == "forced" ? Codes{5, 3} : Codes{5};
+        const utils::SMASHv2Config config(
+            m_folder.write("policy.conf", words.at(2) == "forbids" ? "OEMCustomizeable=5\n" : ""));
+        m_backend->prepareStatus = std::stoi(words[0]);
+        row[0] = kInstall + (options.size() == 2 ? "5,3" : "5");
         expect(row);
-        EXPECT_EQ(checkImage(m_port, options), returnValue == 4096 ? 0 : returnValue);
+        EXPECT_EQ(checkImage(m_port, options), row[1] == "4096" ? 0 : std::stoul(row[1]));
     }
 }
 
