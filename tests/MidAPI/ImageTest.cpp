@@ -102,16 +102,6 @@ Rom pxeFor(std::uint16_t device, std::vector<std::uint16_t> others,
                              .classCode = classCode});
 }
 
-Types typesOf(const std::string& words) {
-    const std::vector<std::string> names{"none", "IMG_CLP", "IMG_iSCSI", "IMG_PXE", "IMG_UEFI", "IMG_FCoE"};
-    Types types;
-    for (const std::string& word : utils::split(words, '+')) {
-        const auto number = std::ranges::find(names, word) - names.begin();
-        types.push_back(word == "77" ? FirmwareType(77) : FirmwareType(number));
-    }
-    return types;
-}
-
 /// As the sample names it.
 Rom fileOf(const std::string& text) {
     Rom otherProcessor = test::madeRom({{CLP, 1}});
@@ -131,7 +121,7 @@ Rom fileOf(const std::string& text) {
     std::vector<utils::FirmwareVersionInfo> components;
     std::istringstream words(text);
     for (std::string type, version; words >> type >> version;)
-        components.push_back({typesOf(type).at(0), static_cast<std::uint32_t>(std::stoul(version))});
+        components.push_back({test::typesOf(type).at(0), static_cast<std::uint32_t>(std::stoul(version))});
     return test::madeRom(components);
 }
 
@@ -140,9 +130,9 @@ TEST(ImagePreparationTest, AnswersByTheTable) {
     for (const auto& row : test::readTestTable(QUENX_MIDAPI_TEST_DIR "/samples/preparations")) {
         SCOPED_TRACE(row[0] + " " + row.at(1));
         const Rom file = fileOf(row[0].substr(5));
-        const Types requested = row[1] == "all" ? Types() : typesOf(row[1]);
+        const Types requested = test::typesOf(row[1]);
         const int status = std::stoi(row.at(2));
-        const Types written = row[2].size() > 2 ? typesOf(row[2].substr(2)) : Types();
+        const Types written = row[2].size() > 2 ? test::typesOf(row[2].substr(2)) : Types();
         test::SyslogCapture::clear();
         const test::PreparedImage prepared = test::prepareImage(row[0].substr(0, 4), file, requested);
         EXPECT_EQ(status, prepared.status);

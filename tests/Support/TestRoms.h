@@ -25,8 +25,14 @@ std::vector<std::uint8_t> withRevision(std::vector<std::uint8_t> rom, std::uint1
 std::vector<std::uint8_t> madeRom(const std::vector<utils::FirmwareVersionInfo>& components,
                                   std::uint16_t vendor = 0x1af4, std::uint16_t device = 0x1041);
 
+/// "IMG_PXE+none+77"; no types for "all".
+std::vector<utils::FirmwareType> typesOf(const std::string& words);
+
 /// "IMG_PXE 1, IMG_UEFI 0"
 std::string describeComponents(const std::vector<utils::FirmwareVersionInfo>& components);
 std::string describeRom(const std::vector<std::uint8_t>& rom);
+
+/// What words stand for: bytes in hexadecimal, and texts in quotes: 0a1b 00 "text".
+std::vector<std::uint8_t> bytesOf(const std::string& words);
 
 }  // namespace test

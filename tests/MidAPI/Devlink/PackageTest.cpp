@@ -6,8 +6,9 @@
 #include "MidAPI/Devlink/PackageVerdict.h"
 #include "MidAPI/Devlink/PldmPackage.h"
 #include "MidAPI/Devlink/Settings.h"
-#include "MidAPI/Image/Bytes.h"
 #include "MidAPI/Image/OptionRom.h"
+#include "Support/TempFolder.h"
+#include "Support/TestRoms.h"
 #include "Utils/Utils.h"
 
 namespace {
@@ -21,85 +22,14 @@ using utils::FirmwareType;
 using enum FirmwareType;
 using Bytes = std::vector<std::uint8_t>;
 
-/// Makes firmware packages of DSP0267, with images of 16 bytes behind the header.
-struct TestPackage {
-    /// Of a device: types and values.
-    using Descriptors = std::vector<std::pair<unsigned, unsigned>>;
-    struct Image {
-        unsigned identifier;
-        std::string version;
-    };
-
-    unsigned revision = 1;
-    std::vector<Descriptors> cards = {{{0x0000, 0x1af4}, {0x0100, 0x1041}}};
-    std::string version = "2.0";               ///< the same for all cards
-    std::vector<Image> images = {{1, "2.0"}};  ///< at most 8
-    unsigned applicable = 1;                   ///< the bitmap of them, the same for all cards
-    unsigned imageSize = 16;                   ///< as the header tells it
-
-    static constexpr std::size_t kSizeField = 17;
-
-    Bytes bytes() const {
-        std::string header = identifier() + number(revision, 1) + number(0, 2) + std::string(13, '\0') +
-                             number(8, 2) + text("package");
-        header += number(cards.size(), 1);
-        for (const Descriptors& card : cards)
-            header += record(card);
-        if (revision >= 2) header += number(1, 1) + number(4, 2) + number(0, 2);  // a downstream device
-        header += number(images.size(), 2);
-        std::string list = entries(0);
-        list = entries(header.size() + list.size() + 4);
-        header += list;
-        Bytes file(header.begin(), header.end());
-        file.resize(file.size() + 4 + images.size() * 16);
-        ma::writeLe16(file, kSizeField, static_cast<std::uint16_t>(header.size() + 4));
-        seal(file);
-        return file;
-    }
-
-    /// Corrects the checksum after a change of the header.
-    static void seal(Bytes& file) {
-        const std::size_t checked = ma::readLe16(file, kSizeField) - 4U;
-        ma::writeLe32(file, checked, ma::crc32(std::span(file).first(checked)));
-    }
-
-  private:
-    static std::string number(std::size_t value, int length) {
-        std::string bytes;
-        for (int index = 0; index < length; ++index)
-            bytes += static_cast<char>(value >> 8 * index & 0xFF);
-        return bytes;
-    }
-    /// ASCII, with its type and length in front.
-    static std::string text(const std::string& value) {
-        return number(1, 1) + number(value.size(), 1) + value;
-    }
-    std::string identifier() const {
-        static constexpr const char* kIdentifiers[] = {
-            "\xF0\x18\x87\x8C\xCB\x7D\x49\x43\x98\x00\xA0\x2F\x05\x9A\xCA\x02",
-            "\x12\x44\xD2\x64\x8D\x7D\x47\x18\xA0\x30\xFC\x8A\x56\x58\x7D\x5A",
-            "\x31\x19\xCE\x2F\xE8\x0A\x4A\x99\xAF\x6D\x46\xF8\xB1\x21\xF6\xBF",
-            "\x7B\x29\x1C\x99\x6D\xB6\x42\x08\x80\x1B\x02\x02\x6E\x46\x3C\x78"};
-        return {kIdentifiers[revision - 1], 16};
-    }
-    std::string record(const Descriptors& card) const {
-        std::string body = number(card.size(), 1) + number(0, 4) + number(1, 1) + number(version.size(), 1) +
-                           number(0, 2) + number(applicable, 1) + version;
-        for (const auto& [type, value] : card)
-            body += number(type, 2) + number(2, 2) + number(value, 2);
-        return number(body.size() + 2, 2) + body;
-    }
-    std::string entries(std::size_t firstImage) const {
-        std::string list;
-        for (const Image& image : images) {
-            list += number(10, 2) + number(image.identifier, 2) + number(7, 4) + number(2, 2) + number(0, 2) +
-                    number(firstImage, 4) + number(imageSize, 4) + text(image.version);
-            if (revision >= 3) list += number(3, 4) + "abc";  // opaque data
-            firstImage += 16;
-        }
-        return list;
-    }
-};
+/// A file of samples/packages.
+Bytes package(const std::string& name) {
+    std::string words;
+    for (const auto& row : test::readTestTable(QUENX_MIDAPI_TEST_DIR "/samples/packages"))
+        if (row[0] == name) words = utils::joined({row.begin() + 1, row.end()}, " ");
+    EXPECT_NE("", words) << name;
+    return test::bytesOf(words);
+}
 
 TEST(VersionTextTest, PacksUpToFourFieldsOfAByte) {
     using ma::devlink::versionNumber;
@@ -141,13 +71,9 @@ TEST(ComponentTableTest, MapsRunningVersionsToTypes) {
 }
 
 TEST(PldmPackageTest, ReadsTheHeadersOfAllRevisions) {
-    for (const unsigned revision : {1U, 2U, 3U}) {
-        SCOPED_TRACE(revision);
-        const Bytes file = TestPackage{.revision = revision,
-                                       .cards = {{{2, 0x1234}, {0, 0x8086}, {0x101, 0x15b3}, {0x102, 0}}, {}},
-                                       .images = {{0x100, "1.0"}, {0x200, "3\x1b"}},
-                                       .applicable = 2}
-                               .bytes();
+    for (const char* name : {"revision 1", "revision 2", "revision 3"}) {
+        SCOPED_TRACE(name);
+        const Bytes file = package(name);
         ASSERT_EQ(ma::devlink::PackageFormat::Known, ma::devlink::packageFormat(file));
         const auto package = ma::devlink::readPldmPackage(file);
         ASSERT_FALSE(package.error) << *package.error;
@@ -169,25 +95,18 @@ TEST(PldmPackageTest, NamesWhatIsBroken) {
     const auto errorOf = [](const Bytes& file) {
         return ma::devlink::readPldmPackage(file).error.value_or("none");
     };
-    const Bytes whole = TestPackage().bytes();
+    const Bytes whole = package("whole");
+    EXPECT_EQ("none", errorOf(whole));
     for (std::size_t length = 16; length < whole.size(); ++length)
         EXPECT_NE("none", errorOf({whole.begin(), whole.begin() + static_cast<std::ptrdiff_t>(length)}));
-    Bytes changed = whole;
-    changed[40] ^= 1;
-    EXPECT_THAT(errorOf(changed), HasSubstr("wrong checksum"));
-    EXPECT_THAT(errorOf(TestPackage{.imageSize = 17}.bytes()), HasSubstr("may be cut short"));
-    EXPECT_THAT(errorOf(TestPackage{.applicable = 3}.bytes()), HasSubstr("names image 2 of 1"));
-    changed = whole;
-    changed[16] = 2;
-    EXPECT_THAT(errorOf(changed), HasSubstr("format revision 2"));
-    changed = whole;
-    changed[44] = 1;  // the length of a record
-    TestPackage::seal(changed);
-    EXPECT_THAT(errorOf(changed), HasSubstr("record of"));
+    EXPECT_THAT(errorOf(package("wrong checksum")), HasSubstr("wrong checksum"));
+    EXPECT_THAT(errorOf(package("image cut short")), HasSubstr("may be cut short"));
+    EXPECT_THAT(errorOf(package("image that is not there")), HasSubstr("names image 2 of 1"));
+    EXPECT_THAT(errorOf(package("revision 2 by its number alone")), HasSubstr("format revision 2"));
+    EXPECT_THAT(errorOf(package("short record")), HasSubstr("record of"));
 }
 
-/// What a card 1af4:1041 of subsystem 1af4:1100, which runs fw 1.9 and fw.mgmt 3.1, says to a file: status
-/// and reason, or types and components and what could not be checked.
+/// What the card of samples/verdicts says to a file.
 std::string answerTo(const Bytes& file, const std::vector<FirmwareType>& types,
                      const std::string& hindrance = "", const ComponentTable& table = {}) {
     const PackageVerdict verdict = ma::devlink::assessPackage(
@@ -201,63 +120,22 @@ std::string answerTo(const Bytes& file, const std::vector<FirmwareType>& types,
     std::string answer = std::to_string(verdict.status) + ' ' + verdict.reason;
     for (const FirmwareType type : verdict.types)
         answer += std::string(ma::firmwareTypeName(type)) + ' ';
-    return answer + utils::joined(verdict.components) + ": " + utils::joined(verdict.unchecked, "; ");
+    const std::string unchecked = utils::joined(verdict.unchecked, "; ");
+    return answer + utils::joined(verdict.components) + (unchecked.empty() ? ":" : ": ") + unchecked;
 }
 
 TEST(PackageVerdictTest, FollowsFromIdsVersionsAndTypes) {
-    const std::string older = "whether it is older than what is installed";
-    const std::string card = "which card the file is for";
-    const std::string opaque = "whether the file is intact; " + card + "; " + older;
-    const TestPackage::Descriptors foreign = {{0, 0x8086}, {0x100, 0x1592}};
-    const TestPackage::Descriptors subsystem = {{0, 0x1af4}, {0x100, 0x1041}, {0x101, 0x1af4}, {0x102, 7}};
-    const Bytes zeros(100);
-    Bytes broken = TestPackage().bytes();
-    broken[50] ^= 1;
-    const std::tuple<Bytes, std::vector<FirmwareType>, std::string> table[] = {
-        {TestPackage().bytes(), {}, "0 : "},
-        {TestPackage{.cards = {foreign, foreign, {{0, 0x1af4}, {0x101, 1}}}}.bytes(),
-         {},
-         "2 the package is for PCI device 8086:1592, 1af4:any, the adapter is 1af4:1041: "},
-        {TestPackage{.cards = {subsystem}}.bytes(),
-         {},
-         "2 the package is for PCI device 1af4:1041 (subsystem 1af4:0007), the adapter is 1af4:1041 "
-         "(subsystem 1af4:1100): "},
-        {TestPackage{.cards = {}}.bytes(),
-         {},
-         "2 the package is for no PCI device, the adapter is 1af4:1041: "},
-        {TestPackage{.version = "1.8.5"}.bytes(),
-         {},
-         "3 fw would go back from version 1.9 (installed) to 1.8.5 (in the file): "},
-        // What only the driver can tell.
-        {TestPackage{.version = "spring"}.bytes(), {}, "0 : " + older},
-        {TestPackage{.cards = {{{0, 0x1af4}}}}.bytes(), {}, "0 : " + card},
-        {TestPackage{.revision = 4}.bytes(), {}, "0 : " + opaque},
-        {zeros, {None}, "0 : " + opaque},
-        {zeros, {PXE, None, PXE}, "0 IMG_PXE fw.undi: " + opaque},
-        {zeros,
-         {PXE, UEFI},
-         "5 the driver takes no component \"fw.uefi\", which IMG_UEFI is here; without types the whole "
-         "device is updated: "},
-        {zeros,
-         {static_cast<FirmwareType>(77)},
-         "5 type 77 is no component that a driver could be asked for: "},
-        {TestPackage{.applicable = 0}.bytes(), {}, "5 the package has no image for this card: "},
-        {{}, {}, "1 the file is empty: "},
-        {Bytes(4097), {}, "1 the file has 4097 bytes, more than the 4096 that are allowed (largest_image): "},
-        {broken,
-         {},
-         "1 the file is not an intact firmware package: it has a wrong checksum of the header (offset "
-         "0x62): "},
-    };
-    for (const auto& [file, types, answer] : table)
-        EXPECT_EQ(answer, answerTo(file, types));
-    EXPECT_EQ("2 this adapter cannot be updated: it has gone: ", answerTo(zeros, {}, "it has gone"));
-    const Bytes olderPart = TestPackage{.images = {{256, "3.0"}}}.bytes();
-    EXPECT_EQ("0 : ", answerTo(olderPart, {}));
+    for (const auto& row : test::readTestTable(QUENX_MIDAPI_TEST_DIR "/samples/verdicts")) {
+        const bool isMade = row[0].ends_with(" zeros");
+        EXPECT_EQ(row.at(2),
+                  answerTo(isMade ? Bytes(std::stoul(row[0])) : package(row[0]), test::typesOf(row.at(1))))
+            << row[0];
+    }
+    EXPECT_EQ("2 this adapter cannot be updated: it has gone:", answerTo(Bytes(100), {}, "it has gone"));
     ComponentTable components;
     components.set(ComponentTable::PackageRow{256, "fw.mgmt"});
-    EXPECT_EQ("3 fw.mgmt would go back from version 3.1 (installed) to 3.0 (in the file): ",
-              answerTo(olderPart, {}, "", components));
+    EXPECT_EQ("3 fw.mgmt would go back from version 3.1 (installed) to 3.0 (in the file):",
+              answerTo(package("image 256"), {}, "", components));
 }
 
 TEST(DevlinkSettingsTest, AreReadWhole) {
