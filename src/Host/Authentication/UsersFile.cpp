@@ -145,20 +145,11 @@ void writeUsersFile(const std::string& path, const UserEntries& users) {
     }
     std::error_code error;
     std::filesystem::create_directories(std::filesystem::path(path).parent_path(), error);
-    // Written beside and renamed over it, so that a reader finds the old file or the new one, never half.
-    const std::string fresh = path + ".new";
-    ::unlink(fresh.c_str());
-    const os::Descriptor file(::open(fresh.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0600));
-    if (file.number() < 0) failToWrite(fresh, errno);
     try {
-        os::writeAll(file.number(),
-                     std::span(reinterpret_cast<const std::uint8_t*>(text.data()), text.size()), fresh);
-        if (::fsync(file.number()) != 0) throw std::system_error(errno, std::generic_category());
+        os::replaceFile(path, text, 0600);
     } catch (const std::system_error& failure) {
-        ::unlink(fresh.c_str());
-        failToWrite(fresh, failure.code().value());
+        failToWrite(path, failure.code().value());
     }
-    if (::rename(fresh.c_str(), path.c_str()) != 0) failToWrite(path, errno);
 }
 
 std::string hashPassword(const std::string& password) {

@@ -6,6 +6,7 @@
 #include <unistd.h>
 
 #include <cerrno>
+#include <cstdlib>
 #include <filesystem>
 #include <system_error>
 
@@ -97,6 +98,23 @@ void writeAll(int file, std::span<const std::uint8_t> bytes, const std::string& 
         if (written < 0 && errno == EINTR) continue;
         if (written < 0) fail(errno, what);
         bytes = bytes.subspan(static_cast<std::size_t>(written));
+    }
+}
+
+void replaceFile(const std::string& path, std::string_view content, mode_t mode) {
+    const std::string purpose = "cannot write " + path;
+    std::string fresh = path + ".XXXXXX";
+    const Descriptor file(::mkostemp(fresh.data(), O_CLOEXEC));
+    if (file.number() < 0) fail(errno, purpose);
+    try {
+        writeAll(file.number(),
+                 std::span(reinterpret_cast<const std::uint8_t*>(content.data()), content.size()), purpose);
+        if (::fchmod(file.number(), mode) != 0 || ::fsync(file.number()) != 0 ||
+            ::rename(fresh.c_str(), path.c_str()) != 0)
+            fail(errno, purpose);
+    } catch (...) {
+        ::unlink(fresh.c_str());
+        throw;
     }
 }
 

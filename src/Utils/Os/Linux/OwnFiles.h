@@ -7,6 +7,7 @@
 #include <span>
 #include <stdexcept>
 #include <string>
+#include <string_view>
 
 #include "Utils/Export.h"
 
@@ -41,6 +42,11 @@ QUENX_EXPORT bool closeFolderToOthers(const std::string& path);
 /// Writes all bytes at the file's position.
 /// @param what  the beginning of the error's text: "cannot write to the flash"
 QUENX_EXPORT void writeAll(int file, std::span<const std::uint8_t> bytes, const std::string& what);
+
+/// Gives a file this content and mode. It is written beside and renamed over it, so that a reader finds the
+/// old file or the new one, never half of it; a link is replaced by a file.
+/// @throws std::system_error "cannot write PATH: REASON"; the old file is as it was
+QUENX_EXPORT void replaceFile(const std::string& path, std::string_view content, mode_t mode);
 
 /// Returns when the entries of a folder (files made, renamed or removed in it) are on the medium.
 QUENX_EXPORT void syncFolder(const std::string& path);
