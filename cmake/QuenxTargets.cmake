@@ -52,12 +52,36 @@ if(QUENX_PRECOMPILE)
     target_link_libraries(quenx_settings INTERFACE quenx_precompiled_settings)
 endif()
 
-# quenx_library(NAME SOURCES... [LINK targets...]): a shared library libNAME.so
+# Libraries of different builds do not load each other, see SameBuild.cpp.
+set(quenx_build_id ${CMAKE_BINARY_DIR}/generated/BuildId.h)
+set(quenx_build_folders src/Utils src/Framework src/MidAPI src/Providers)
+set(quenx_build_salt "${PROJECT_VERSION} ${CMAKE_CXX_COMPILER_ID} ${CMAKE_CXX_COMPILER_VERSION} ${QUENX_SANITIZE}")
+set(quenx_build_headers)
+foreach(folder IN LISTS quenx_build_folders)
+    file(GLOB_RECURSE headers ${PROJECT_SOURCE_DIR}/${folder}/*.h)
+    list(APPEND quenx_build_headers ${headers})
+endforeach()
+add_custom_command(OUTPUT ${quenx_build_id}
+    COMMAND ${CMAKE_COMMAND} -D quenx_root=${PROJECT_SOURCE_DIR} -D "quenx_folders=${quenx_build_folders}"
+        -D "quenx_salt=${quenx_build_salt}" -D quenx_output=${quenx_build_id}
+        -P ${PROJECT_SOURCE_DIR}/cmake/QuenxBuildId.cmake
+    DEPENDS ${quenx_build_headers} ${PROJECT_SOURCE_DIR}/cmake/QuenxBuildId.cmake
+    VERBATIM)
+add_library(quenx_same_build OBJECT ${PROJECT_SOURCE_DIR}/cmake/SameBuild.cpp ${quenx_build_id})
+target_include_directories(quenx_same_build PUBLIC ${CMAKE_BINARY_DIR}/generated)
+target_link_libraries(quenx_same_build PRIVATE quenx_settings)
+set_target_properties(quenx_same_build PROPERTIES POSITION_INDEPENDENT_CODE ON)
+
+# quenx_library(NAME SOURCES... [ANY_BUILD] [LINK targets...]): a shared library libNAME.so; with ANY_BUILD it is loaded
+# whatever it finds below, and looks at the build itself
 function(quenx_library name)
-    cmake_parse_arguments(ARG "" "" "LINK" ${ARGN})
+    cmake_parse_arguments(ARG "ANY_BUILD" "" "LINK" ${ARGN})
     add_library(${name} SHARED ${ARG_UNPARSED_ARGUMENTS})
     target_link_libraries(${name} PUBLIC quenx_settings ${ARG_LINK})
     quenx_precompile(${name} library)
+    if(TARGET Quenx_Utils AND NOT name STREQUAL Quenx_Utils AND NOT ARG_ANY_BUILD)  # in the order of src/CMakeLists.txt
+        target_sources(${name} PRIVATE $<TARGET_OBJECTS:quenx_same_build>)
+    endif()
     target_link_options(${name} PRIVATE -Wl,--no-undefined-version -Wl,-z,relro,-z,now)
     # What a library lacks fails here, not when a host loads it. Clang puts the sanitizers' runtime into programs alone.
     if(NOT QUENX_SANITIZE)

@@ -2,9 +2,14 @@
 // How requests end.
 #include <pthread.h>
 
+#include "BuildId.h"
 #include "Cmpi/Request.h"
 #include "Cmpi/Slots.h"
 #include "Framework/Requests/Audit.h"
+#include "Utils/Build.h"
+
+/// Only the libraries of this build have it. Where they are of another one, nothing of theirs may be used.
+extern "C" [[gnu::weak]] QUENX_EXPORT const char QUENX_BUILD_SYMBOL;
 
 namespace cmpi {
 
@@ -57,6 +62,13 @@ Status failure(const Sender& sender, CimStatus status, const std::string& text) 
     return {code, newString(broker, text)};
 }
 
+Status refuseForBuild(const Sender& sender) {
+    return failure(
+        sender, CimStatus::Failed,
+        std::string("libQuenx_Cmpi.so is of build " QUENX_BUILD_ID ", the other libraries are of build ") +
+            utils::buildId() + ". Install all of them from one build, and restart the object manager.");
+}
+
 Status carryOut(const Sender& sender, const std::function<void(Request&)>& body) {
     try {
         Request request(sender);
@@ -78,6 +90,7 @@ Status carryOut(const Sender& sender, const std::function<void(Request&)>& body)
 Status answerWith(const Sender& sender, const std::function<void(Request&)>& body) noexcept {
     const CancellationBan ban;
     try {
+        if (&QUENX_BUILD_SYMBOL == nullptr) return refuseForBuild(sender);
         return carryOut(sender, body);
     } catch (...) {
         // Not even the text could be built.

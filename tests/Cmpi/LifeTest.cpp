@@ -14,6 +14,7 @@
 #include "Support/ProviderLibrary.h"
 #include "Support/SimulatedAdapters.h"
 #include "Support/TestRoms.h"
+#include "Utils/Build.h"
 #include "Utils/Os/Linux/SMASHv2Config.h"
 
 #ifndef __has_feature  // Clang has it
@@ -182,6 +183,26 @@ TEST(CmpiFrontTest, DecidesAboutCleanupOnceUntilThereIsAnotherRequest) {
     // Between the answers to two interfaces: the second one is decided anew.
     EXPECT_EQ(front.ask(check).called.returnValue, 0U);
     EXPECT_EQ(front.cleanup(), " 50 50 50") << "the check has claimed the adapter";
+}
+
+TEST(CmpiFrontTest, ServesNothingFromLibrariesOfAnotherBuild) {
+    const auto bytes = test::readTestFile(QUENX_CMPI_LIBRARY);
+    std::string library(bytes.begin(), bytes.end());
+    const std::string own = utils::buildId();
+    for (std::size_t at = 0; (at = library.find(own, at)) != std::string::npos;)
+        library.replace(at, own.size(), own.size(), '0');
+    const test::TempFolder folder;
+    const LoadedFront whole(QUENX_CMPI_LIBRARY, test::Dialect::Sfcb);  // with the libraries below
+    const LoadedFront other(folder.write("libother.so", library).c_str(), test::Dialect::Sfcb);
+    try {
+        other.first("Quenx_EthernetPort");
+        ADD_FAILURE() << "served";
+    } catch (const core::CimError& error) {
+        EXPECT_EQ(error.what(),
+                  "libQuenx_Cmpi.so is of build 000000000000, the other libraries are of build " + own +
+                      ". Install all of them from one build, and restart the object manager.");
+    }
+    EXPECT_EQ(other.cleanup(), " 0 0 0");
 }
 
 }  // namespace

@@ -7,6 +7,7 @@
 #include <filesystem>
 
 #include "Framework/Requests/CimRequests.h"
+#include "Utils/Build.h"
 
 namespace core {
 
@@ -34,8 +35,11 @@ std::vector<std::filesystem::path> librariesIn(const std::string& directory) {
 
 /// The loader's words for its failure just now, without the file, which it names first when it can.
 std::string loaderReason(const std::string& file) {
-    const std::string reason = dlerror();
-    return reason.starts_with(file + ": ") ? reason.substr(file.size() + 2) : reason;
+    std::string reason = dlerror();
+    if (reason.starts_with(file + ": ")) reason.erase(0, file.size() + 2);
+    if (reason.find("quenx_build_") == std::string::npos) return reason;
+    return std::string("it is of another build than the libraries in use, which are of build ") +
+           utils::buildId() + " (" + reason + ")";
 }
 
 }  // namespace
