@@ -8,6 +8,7 @@
 #include <iostream>
 #include <set>
 #include <string_view>
+#include <tuple>
 
 #include "Utils/Utils.h"
 
@@ -171,6 +172,27 @@ void addModelVerbs(CLI::App& app, Arguments& arguments) {
     addVerb(app, arguments, "mof", showMof, "Print the schema of all served classes as MOF");
 }
 
+void addRegistration(CLI::App& app, Arguments& arguments) {
+    RegistrationOptions& options = arguments.options.registration;
+    CLI::App* verb = addVerb(app, arguments, "registration", showRegistration,
+                             "Print or write what another object manager needs to load the providers");
+    addValue(*verb, "--for", options.manager, "MANAGER", "Object manager: sfcb or pegasus")->required();
+    addValue(*verb, "--namespace", options.namespaces, "NAME",
+             "Serve the classes in this namespace; may be given several times (default: that of the "
+             "configuration, root/cimv2)")
+        ->allow_extra_args(false);
+    addValue(*verb, "--output", options.directory, "DIR",
+             "Write the files into this folder, replacing older ones (default: print them)");
+    CLI::Option* qualifiers = verb->add_flag("--qualifiers", options.withQualifiers,
+                                             "Also declare the qualifiers, for an object manager without the "
+                                             "standard schema");
+    verb->add_flag("--remove", options.isRemoval, "What undoes the registration, as a script")
+        ->excludes(qualifiers);
+    verb->footer(
+        "Nothing is registered, removed or restarted by this: what to do next is printed on standard "
+        "error.");
+}
+
 /// In the order in which the help lists them.
 void addVerbs(CLI::App& app, Arguments& arguments) {
     CLI::App* adapters =
@@ -189,6 +211,7 @@ void addVerbs(CLI::App& app, Arguments& arguments) {
              "Job: its id as \"jobs\" lists it, or the number at its end")
         ->required();
     addModelVerbs(app, arguments);
+    addRegistration(app, arguments);
 }
 
 constexpr const char* kAskHelp = "\"quenxctl --help\" lists the verbs and options.";
@@ -292,11 +315,16 @@ void requireOneImage(const CLI::App& app, const Arguments& arguments) {
                        askHelpOf(*app.get_subcommands().front()));
 }
 
-/// Who resets a card has to be where its network is.
+/// Who resets a card has to be where its network is, and who registers libraries where they are.
 void requireOwnMachine(const Arguments& arguments) {
-    if (arguments.verb == activate && arguments.server.url)
-        throw CommandError(ExitStatus::WrongUse, "\"activate\" cannot be used with --server.",
-                           "Run it on the machine that has the adapter.");
+    for (const auto& [verb, name, place] :
+         {std::tuple{&activate, "activate", "that has the adapter"},
+          std::tuple{&showRegistration, "registration", "of the object manager"}}) {
+        if (arguments.verb == verb && arguments.server.url)
+            throw CommandError(ExitStatus::WrongUse,
+                               "\"" + std::string(name) + "\" cannot be used with --server.",
+                               "Run it on the machine " + std::string(place) + ".");
+    }
 }
 
 /// Jobs are kept by a server: where no other is named, the one of this machine, if it is there for this user.

@@ -47,8 +47,8 @@ TEST_P(SessionTest, ShowsWhatIsWrittenDown) {
 
 INSTANTIATE_TEST_SUITE_P(Shell, SessionTest,
                          ::testing::Values("BadFiles", "CommandLine", "ConfigCheck", "Daemon", "Domains",
-                                           "Help", "Identities", "Install", "Json", "Settings", "Staged",
-                                           "UsersFile", "WrongImages"),
+                                           "Help", "Identities", "Install", "Json", "Settings",
+                                           "Registration", "Staged", "UsersFile", "WrongImages"),
                          [](const auto& session) { return session.param; });
 
 }  // namespace

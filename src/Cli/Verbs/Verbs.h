@@ -7,6 +7,7 @@
 #include "Cli/Connection/Connection.h"
 #include "Cli/Display/Messages.h"
 #include "Cli/Display/Progress.h"
+#include "Cli/Registration/Registration.h"
 #include "Cli/Update/Candidate.h"
 #include "Cli/Update/Jobs.h"
 
@@ -34,6 +35,7 @@ struct VerbOptions {
     bool namesOnly = false;          ///< instances, associators, references
     bool pendingOnly = false;        ///< adapters
     bool mayDisrupt = false;         ///< activate
+    RegistrationOptions registration;
 };
 
 using Verb = ExitStatus (*)(Context& context, const VerbOptions& options);
@@ -58,6 +60,10 @@ ExitStatus showReferences(Context& context, const VerbOptions& options);
 /// first, then each class after its superclass and after the classes that it refers to, as far as those do
 /// not refer to each other.
 ExitStatus showMof(Context& context, const VerbOptions& options);
+
+/// What another object manager has to be told to load the providers: files, or their texts one below the
+/// other, and on the stream of errors what to do with them. Only in process.
+ExitStatus showRegistration(Context& context, const VerbOptions& options);
 
 /// What to do about a class that is not served.
 inline constexpr const char* kAskMof = "\"quenxctl mof\" prints the classes that are served.";

@@ -1,9 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
+#include "Cli/Display/Mof.h"
+
 #include <algorithm>
 #include <map>
 
-#include "Cli/Display/Output.h"
-#include "Cli/Verbs/Verbs.h"
+#include "Cli/Display/Messages.h"
 #include "Utils/Utils.h"
 
 namespace cli {
@@ -78,19 +79,8 @@ std::string methodText(const core::MethodDeclaration& method) {
            joined(parameters, ",\n") + ");\n";
 }
 
-std::string classText(const core::ClassDeclaration& declaration) {
-    std::string text = qualifierList(declaration.qualifiers, "") + "class " + declaration.name;
-    if (!declaration.superclass.empty()) text += " : " + declaration.superclass;
-    text += " {\n";
-    for (const core::PropertyDeclaration& property : declaration.properties)
-        text += elementText(property, std::string(4, ' ')) + ";\n";
-    for (const core::MethodDeclaration& method : declaration.methods)
-        text += methodText(method);
-    return text + "};\n";
-}
-
 /// The classes that are still to be written, by folded name: the same order on every machine.
-using Waiting = std::map<std::string, const core::ClassDeclaration*>;
+using Waiting = std::map<std::string, const core::ClassChain*>;
 
 bool isDone(const Waiting& waiting, const std::string& name, const core::ClassDeclaration& user) {
     return core::sameName(name, user.name) || !waiting.contains(core::foldName(name));
@@ -111,44 +101,47 @@ bool refersToDone(const Waiting& waiting, const core::ClassDeclaration& declarat
 Waiting::const_iterator nextClass(const Waiting& waiting) {
     auto best = waiting.end();
     for (auto each = waiting.begin(); each != waiting.end(); ++each) {
-        if (!isDone(waiting, each->second->superclass, *each->second)) continue;
-        if (refersToDone(waiting, *each->second)) return each;
+        const core::ClassDeclaration& declaration = *each->second->front();
+        if (!isDone(waiting, declaration.superclass, declaration)) continue;
+        if (refersToDone(waiting, declaration)) return each;
         if (best == waiting.end()) best = each;
     }
     // If a server answers each time otherwise, none may fit; the loop must end even then.
     return best == waiting.end() ? waiting.begin() : best;
 }
 
-std::string mofText(const std::vector<core::ClassChain>& classes) {
+}  // namespace
+
+std::string qualifiersMof() {
     std::string text;
     for (const core::QualifierDeclaration& declaration : core::qualifierDeclarations())
         text += declarationText(declaration);
-    Waiting waiting;
-    // If a server sends two classes of one name, the first counts, as it does in the chains.
-    for (const core::ClassChain& chain : classes)
-        waiting.emplace(core::foldName(chain.front()->name), chain.front().get());
-    while (!waiting.empty()) {
-        const auto next = nextClass(waiting);
-        text += "\n" + classText(*next->second);
-        waiting.erase(next);
-    }
     return text;
 }
 
-}  // namespace
+std::string classMof(const core::ClassDeclaration& declaration) {
+    std::string text = qualifierList(declaration.qualifiers, "") + "class " + declaration.name;
+    if (!declaration.superclass.empty()) text += " : " + declaration.superclass;
+    text += " {\n";
+    for (const core::PropertyDeclaration& property : declaration.properties)
+        text += elementText(property, std::string(4, ' ')) + ";\n";
+    for (const core::MethodDeclaration& method : declaration.methods)
+        text += methodText(method);
+    return text + "};\n";
+}
 
-ExitStatus showMof(Context& context, const VerbOptions&) {
-    const std::string text = mofText(context.connection.operations->enumerateClasses("", true));
-    if (context.json) {
-        printJson(context.out, {{"mof", text}});
-    } else {
-        // A server's descriptions are texts like any other; only line ends are the program's own.
-        auto lines = utils::split(text, '\n');
-        for (std::string& line : lines)
-            line = printable(line);
-        context.out << joined(lines, "\n");
+std::vector<core::ClassChain> inMofOrder(const std::vector<core::ClassChain>& classes) {
+    Waiting waiting;
+    // If a server sends two classes of one name, the first counts, as it does in the chains.
+    for (const core::ClassChain& chain : classes)
+        waiting.emplace(core::foldName(chain.front()->name), &chain);
+    std::vector<core::ClassChain> ordered;
+    while (!waiting.empty()) {
+        const auto next = nextClass(waiting);
+        ordered.push_back(*next->second);
+        waiting.erase(next);
     }
-    return ExitStatus::Done;
+    return ordered;
 }
 
 }  // namespace cli
