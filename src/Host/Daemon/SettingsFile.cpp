@@ -4,8 +4,8 @@
 #include <stdexcept>
 
 #include "Host/Daemon/SettingsField.h"
-#include "MidAPI/Toml.h"
 #include "Utils/Os/Linux/linux.h"
+#include "Utils/Toml.h"
 #include "Utils/Utils.h"
 
 namespace host {
@@ -78,8 +78,8 @@ std::string textOf(const std::string& file) try {
 toml::table parse(const std::string& file) {
     const std::string text = textOf(file);
     try {
-        return ma::parseToml(text);
-    } catch (const ma::TomlError& error) {
+        return utils::parseToml(text);
+    } catch (const utils::TomlError& error) {
         throw std::runtime_error(file + ":" + std::to_string(error.line()) + ": " + error.what() +
                                  hintAt(text, error.line()));
     }

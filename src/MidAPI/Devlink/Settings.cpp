@@ -5,11 +5,13 @@
 #include <system_error>
 
 #include "MidAPI/Image/OptionRom.h"
-#include "MidAPI/Toml.h"
 #include "Utils/Os/Linux/linux.h"
+#include "Utils/Toml.h"
 
 namespace ma::devlink {
 namespace {
+
+using utils::TomlTable;
 
 constexpr const char* kVariable = "QUENX_DEVLINK";
 constexpr const char* kDefaultFile = "/etc/quenx-devlink.toml";
@@ -54,8 +56,8 @@ std::optional<std::string> readSettings(const char* named, const std::string& pa
 }  // namespace
 
 Settings parseSettings(std::string_view text, const std::string& fileName) try {
-    const toml::table parsed = parseToml(text);
-    const TomlTable top(parsed, fileName, "the settings of devlink");
+    const toml::table parsed = utils::parseToml(text);
+    const TomlTable top(parsed, "the settings of devlink");
     top.allowOnly(kTopKeys);
     Settings settings;
     settings.firmwareFolder = top.text("firmware_folder").value_or("");
@@ -65,8 +67,8 @@ Settings parseSettings(std::string_view text, const std::string& fileName) try {
     for (const toml::table* node : top.tables("package_component"))
         settings.components.set(readPackageComponent(top.inner(*node, "a component of packages")));
     return settings;
-} catch (const TomlError& error) {
-    throw AdapterError(fileName + ", line " + std::to_string(error.line()) + ": " + error.what());
+} catch (const utils::TomlError& error) {
+    throw AdapterError(error.in(fileName));
 }
 
 Settings loadSettings() {

@@ -9,12 +9,15 @@
 
 #include "MidAPI/AdapterTypes.h"
 #include "MidAPI/Image/OptionRom.h"
-#include "MidAPI/Toml.h"
 #include "Utils/Os/Linux/linux.h"
+#include "Utils/Toml.h"
 #include "Utils/Utils.h"
 
 namespace ma {
 namespace {
+
+using utils::inQuotes;
+using utils::TomlTable;
 
 constexpr std::size_t kLongestName = 64;
 constexpr std::uint64_t kHighestSpeed = std::numeric_limits<std::int64_t>::max();  // all that TOML has
@@ -182,16 +185,16 @@ void refuseDoubles(const std::vector<AdapterDescription>& adapters, const TomlTa
 
 std::vector<AdapterDescription> parseAdapterDescriptions(std::string_view text,
                                                          const std::string& fileName) try {
-    const toml::table parsed = parseToml(text);
-    const TomlTable top(parsed, fileName, "adapter description");
+    const toml::table parsed = utils::parseToml(text);
+    const TomlTable top(parsed, "adapter description");
     top.allowOnly(kTopKeys);
     std::vector<AdapterDescription> adapters;
     for (const toml::table* node : top.tables("adapter"))
         adapters.push_back(readAdapter(*node, top, adapters.size() + 1));
     refuseDoubles(adapters, top);
     return adapters;
-} catch (const TomlError& error) {
-    throw AdapterError(fileName + ", line " + std::to_string(error.line()) + ": " + error.what());
+} catch (const utils::TomlError& error) {
+    throw AdapterError(error.in(fileName));
 }
 
 std::vector<AdapterDescription> loadAdapterDescriptions(const std::string& path) {

@@ -1,11 +1,11 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "MidAPI/Toml.h"
+#include "Utils/Toml.h"
 
 #include <algorithm>
 
 #include "Utils/Utils.h"
 
-namespace ma {
+namespace utils {
 namespace {
 
 constexpr std::string_view kBlanks = " \t\r\n";
@@ -20,7 +20,7 @@ bool isBracket(char c) {
 }
 
 bool isKeyCharacter(char c) {
-    return utils::isLetter(c) || utils::isDigit(c) || c == '_' || c == '-' || c == '.';
+    return isLetter(c) || isDigit(c) || c == '_' || c == '-' || c == '.';
 }
 
 /// TOML allows characters beyond ASCII in quotes and comments alone. Anywhere else toml++ 3.3 asks whether
@@ -65,7 +65,7 @@ class AsciiCheck {
                 static_cast<std::size_t>(std::find_if_not(word.begin(), word.end(), belongs) - word.begin()));
         };
         skip(isBracket);
-        if (word.starts_with('_') || (!word.empty() && utils::isLetter(word[0]))) skip(isKeyCharacter);
+        if (word.starts_with('_') || (!word.empty() && isLetter(word[0]))) skip(isKeyCharacter);
         if (word.starts_with('=')) word.remove_prefix(1);
         skip(isBracket);
         return word.empty();
@@ -116,6 +116,10 @@ std::string listOf(std::span<const std::string_view> names) {
 
 TomlError::~TomlError() = default;
 
+std::string TomlError::in(const std::string& fileName) const {
+    return fileName + ", line " + std::to_string(m_line) + ": " + what();
+}
+
 toml::table parseToml(std::string_view text) {
     AsciiCheck(text).run();
     try {
@@ -129,18 +133,25 @@ std::string inQuotes(std::string_view text) {
     constexpr std::size_t kLongest = 60;
     std::string result = "\"";
     for (const char character : text.substr(0, kLongest))
-        result += utils::isControl(character) ? '?' : character;
+        result += isControl(character) ? '?' : character;
     return result + (text.size() > kLongest ? "...\"" : "\"");
 }
 
 void TomlTable::failAt(const toml::source_region& where, const std::string& what) const {
-    throw AdapterError(m_fileName + ", line " + std::to_string(where.begin.line) + ": " + m_subject + ": " +
-                       what);
+    throw TomlError(m_subject + ": " + what, where.begin.line);
+}
+
+const toml::source_region& TomlTable::placeOf(std::string_view key) const {
+    const toml::node* node = m_table.get(key);
+    return node != nullptr ? node->source() : m_table.source();
+}
+
+std::size_t TomlTable::line(std::string_view key) const {
+    return placeOf(key).begin.line;
 }
 
 void TomlTable::fail(std::string_view key, const std::string& what) const {
-    const toml::node* node = m_table.get(key);
-    failAt(node != nullptr ? node->source() : m_table.source(), what);
+    failAt(placeOf(key), what);
 }
 
 void TomlTable::refuse(std::string_view key, std::string_view value, const std::string& expected) const {
@@ -186,6 +197,24 @@ std::vector<const toml::table*> TomlTable::tables(std::string_view key) const {
     fail(key, "\"" + std::string(key) + "\" must be a list of tables");
 }
 
+std::optional<std::vector<std::string>> TomlTable::texts(std::string_view key,
+                                                         bool (*isRight)(std::string_view),
+                                                         const std::string& expected) const {
+    const toml::node* node = m_table.get(key);
+    if (node == nullptr) return std::nullopt;
+    const std::string shouldBe = "\"" + std::string(key) + "\" must be a list of " + expected;
+    const toml::array* array = node->as_array();
+    if (array == nullptr) fail(key, shouldBe);
+    std::vector<std::string> result;
+    for (const toml::node& element : *array) {
+        const auto* text = element.as_string();
+        if (text == nullptr) failAt(element.source(), shouldBe);
+        if (!isRight(text->get())) failAt(element.source(), shouldBe + ", not " + inQuotes(text->get()));
+        result.push_back(text->get());
+    }
+    return result;
+}
+
 std::optional<std::size_t> TomlTable::choice(std::string_view key,
                                              std::span<const std::string_view> names) const {
     const std::optional<std::string> value = text(key);
@@ -207,4 +236,4 @@ void TomlTable::allowOnly(std::span<const std::string_view> keys) const {
     }
 }
 
-}  // namespace ma
+}  // namespace utils
