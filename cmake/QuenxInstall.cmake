@@ -18,7 +18,8 @@ install(FILES ${CMAKE_BINARY_DIR}/quenx-cimd.service DESTINATION lib/systemd/sys
 install(FILES packaging/tmpfiles.d/quenx.conf DESTINATION lib/tmpfiles.d)
 install(DIRECTORY docs/ DESTINATION share/doc/quenx)
 install(FILES CHANGELOG.md LICENSE DESTINATION share/doc/quenx)
-install(FILES packaging/adapters.toml packaging/devlink.toml packaging/quenx-cimd.toml packaging/quenx-cimprovider.conf
+install(FILES packaging/adapters.toml packaging/devlink.toml packaging/policy.toml packaging/quenx-cimd.toml
+    packaging/quenx-cimprovider.conf
     DESTINATION share/doc/quenx/examples)
 
 # Configuration goes below the prefix, for /usr to /etc. With another prefix PAM still reads /etc alone: set this to it.

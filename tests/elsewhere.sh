@@ -25,11 +25,12 @@ if [ "$(id -u)" = 0 ]; then
         mkdir -p "$cache" "$place/ccache"
         export CCACHE_DIR="$place/ccache" CCACHE_READONLY=1 CCACHE_TEMPDIR=/tmp
         cp -a /etc "$place/etc"
-        mkdir -p "$place/etc/quenx-cimd"
+        mkdir -p "$place/etc/quenx-cimd" "$place/etc/quenx"
         printf 'Namespace=root/elsewhere\nOEMCustomizeable=5\nFWFilePath=/usr/lib/ipxe/qemu\n' \
             >"$place/etc/quenx-cimprovider.conf"
         echo 'not = [ the adapters of a test' >"$place/etc/quenx-adapters.toml"
         echo 'not = [ the settings of a test' >"$place/etc/quenx-cimd/quenx-cimd.toml"
+        echo 'not = [ the policy of a test' >"$place/etc/quenx/policy.toml"
         as_user=(unshare --mount --propagation private
             sh -c 'mount --bind "$1" "$2/ccache" && mount --bind "$2/etc" /etc && shift 2 && exec "$@"' sh
             "$cache" "$place" tools/contained.sh "$place" -- "${as_user[@]}")

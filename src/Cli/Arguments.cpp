@@ -65,6 +65,8 @@ void addCommonOptions(CLI::App& app, Arguments& arguments) {
     CLI::Option* config =
         addValue(app, "--config", providers.configFile, "FILE",
                  "Configuration file of the providers (default: /etc/quenx-cimprovider.conf)");
+    CLI::Option* policy = addValue(app, "--policy", providers.policyFile, "FILE",
+                                   "Who may install (default: /etc/quenx/policy.toml)");
     CLI::Option* backend = addValue(
         app, "--backend", providers.adapters.backend, "NAME",
         "Which adapters: devlink for this machine's own, simulator, or auto (default: QUENX_BACKEND, "
@@ -79,7 +81,7 @@ void addCommonOptions(CLI::App& app, Arguments& arguments) {
     CLI::Option* directory =
         addValue(app, "--providers", providers.directory, "DIR",
                  "Directory of the provider libraries (default: those installed with this program)");
-    addServerOptions(app, arguments.server, {config, backend, adapters, directory});
+    addServerOptions(app, arguments.server, {config, policy, backend, adapters, directory});
 }
 
 std::vector<std::string> typesOf(std::string text) {
@@ -330,8 +332,8 @@ void requireOwnMachine(const Arguments& arguments) {
 /// Jobs are kept by a server: where no other is named, the one of this machine, if it is there for this user.
 void chooseServer(Arguments& arguments) {
     const ProviderSettings& own = arguments.providers;
-    const bool namesProviders =
-        !own.configFile.empty() || own.adapters.backend || own.adapters.description || !own.directory.empty();
+    const bool namesProviders = !own.configFile.empty() || !own.policyFile.empty() || own.adapters.backend ||
+                                own.adapters.description || !own.directory.empty();
     const bool needsServer = arguments.verb == showJobs || arguments.verb == deleteJob;
     if (arguments.server.url || namesProviders || !needsServer) return;
     if (::access(localSocket().c_str(), W_OK) == 0) arguments.server.url.emplace("unix:");
@@ -386,6 +388,7 @@ std::optional<Arguments> readArguments(int argc, char** argv) {
     requireOneImage(app, arguments);
     requireOwnMachine(arguments);
     chooseServer(arguments);
+    arguments.providers.isGuarded = arguments.verb == install;
     return arguments;
 }
 

@@ -15,6 +15,7 @@
 
 #include "Cli/Arguments.h"
 #include "Cli/Display/Output.h"
+#include "Framework/Requests/PolicyDecision.h"
 #include "Utils/Os/Linux/linux.h"
 
 namespace cli {
@@ -71,7 +72,11 @@ std::string adviceFor(const core::CimError& error) {
         case core::CimStatus::NotFound:
             return "\"quenxctl instances CLASS --names\" prints the paths of what there is.";
         case core::CimStatus::AccessDenied:
-            return "Log in as a user who may do this: on quenx-cimd, an administrator.";
+            return std::string_view(error.what()).starts_with(core::kBadPolicy)
+                       ? kMendPolicy
+                       : "Use a name that may do this: on quenx-cimd that of an administrator, and where "
+                         "there "
+                         "is a policy one that it has.";
         case core::CimStatus::InvalidNamespace:
             return "Check --namespace, or the line \"Namespace=\" of the configuration file.";
         case core::CimStatus::ServerIsShuttingDown:

@@ -3,6 +3,7 @@
 
 #include "Cmpi/Slots.h"
 #include "Framework/Requests/Audit.h"
+#include "Framework/Requests/PolicyDecision.h"
 
 namespace cmpi {
 
@@ -115,6 +116,7 @@ void Request::audited(const std::string& operation, const std::vector<core::Argu
                            "cmpi:" + textOf(manager == nullptr ? nullptr : manager->brokerName), operation,
                            target.toString(), ""};
     try {
+        const core::CallerScope scope({.principal = event.user});
         event.outcome = work();
     } catch (const CimError& error) {
         event.outcome = core::outcomeOf(error.status(), error.what());

@@ -74,6 +74,7 @@ struct Settings {
     JobSettings jobs;
     std::string providers;              ///< directory of the provider libraries
     std::string providerConfiguration;  ///< empty: the providers' own default
+    std::string policy;                 ///< file of the policy; empty: the machine's
     std::string backend;                ///< which adapters; empty: default
     std::string adapters;               ///< description of simulated adapters; empty: default
     std::string adapterState;           ///< their state directory; empty: default

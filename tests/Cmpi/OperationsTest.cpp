@@ -2,11 +2,15 @@
 // What clients get through the interface is what the request layer gives in process, value for value.
 #include <gtest/gtest.h>
 
+#include <filesystem>
+#include <fstream>
+
 #include "Cmpi/LoadedFront.h"
 #include "Framework/Requests/CimRequests.h"
 #include "Support/SimulatedAdapters.h"
 #include "Support/SyslogCapture.h"
 #include "Support/TestModel.h"
+#include "Utils/Os/Linux/PolicyFile.h"
 
 namespace {
 
@@ -280,6 +284,26 @@ TEST_F(CmpiOperationsTest, KnowsNothingOfOtherClassesAndServesEveryNamespace) {
         const auto* echo = core::findByName(call.out.entries, "Echo");
         EXPECT_EQ(core::valueText(echo->value), "new");
     }
+}
+
+TEST_F(CmpiOperationsTest, AsksThePolicyForThePrincipal) {
+    const std::string file = utils::systemPolicyFile.load();
+    const Request unknown{"invoke", m_a, {}, {}, "Unknown"};
+    for (test::LoadedFront& front : m_fronts) {
+        front.create();
+        const auto answerUnder = [&](const char* text, const Request& request) {
+            std::ofstream(file) << text << "\n";
+            return answerOf([&] { return front.ask(request); });
+        };
+        const std::string denied = "status 2: user \"root\" may only read: ";
+        for (const Request& request : {unknown, Request{"delete", m_a}})
+            EXPECT_EQ(answerUnder("administrators = ['alice']", request).substr(0, denied.size()), denied);
+        EXPECT_EQ(answerUnder("administrators = ['root']", unknown).substr(0, 9), "status 17");
+        front.broker.contexts.getEntry = nullptr;
+        EXPECT_EQ(answerOf([&] { return front.ask(unknown); }).substr(0, 33),
+                  "status 2: a caller without a name");
+    }
+    std::filesystem::remove(file);
 }
 
 TEST_F(CmpiOperationsTest, LeavesAuditLinesWithThePrincipal) {

@@ -4,6 +4,7 @@
 #include "Fuzz/Fuzz.h"
 #include "MidAPI/AdapterTypes.h"
 #include "MidAPI/Simulator/Simulator.h"
+#include "Utils/Policy.h"
 
 namespace {
 
@@ -23,6 +24,14 @@ void useAdapters(std::vector<ma::AdapterDescription> adapters) {
 }  // namespace
 
 void fuzz(const std::string& text) {
+    // The same reader, with the keys of another file.
+    try {
+        const utils::Policy policy = utils::parsePolicy(text, "fuzz.toml");
+        for (const std::string& name : policy.administrators.value_or(std::vector<std::string>()))
+            require(!name.empty() && name.find_first_of("\n*") == std::string::npos);
+    } catch (const utils::PolicyError& error) {
+        require(std::string_view(error.what()).starts_with("fuzz.toml, line "));
+    }
     try {
         useAdapters(ma::parseAdapterDescriptions(text, "fuzz.toml"));
     } catch (const ma::AdapterError& error) {

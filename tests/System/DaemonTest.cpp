@@ -148,6 +148,17 @@ bool canMount() {
     return test::run(withOwnMounts({"mount --bind /etc /etc && test -d /sys/bus/pci/devices"})).status == 0;
 }
 
+TEST(DaemonTest, SaysThatItsPolicyIsBadAndGoesOnServingReaders) {
+    RunningDaemon daemon;
+    const std::string policy = daemon.folder().write("policy.toml", "administrators = 'admin'\n");
+    daemon.program().send(SIGHUP);
+    EXPECT_TRUE(
+        daemon.program().waitFor("The policy cannot be obeyed, and nothing is installed or deleted "
+                                 "until it is mended: " +
+                                 policy + ", line 1: "));
+    EXPECT_EQ(daemon.lines("ein", "Quenx_EthernetPort").size(), 5U);
+}
+
 TEST(DaemonTest, ReadsTheSystemsFilesWhereNoneAreNamed) {
     if (!canMount()) GTEST_SKIP() << "nothing can be mounted";
     const test::TempFolder etc;  // and what is written at run time, and the PCI functions
@@ -168,6 +179,9 @@ TEST(DaemonTest, ReadsTheSystemsFilesWhereNoneAreNamed) {
     EXPECT_THAT(withThisEtc(QUENXCTL, "identities").out, HasSubstr("file:///etc/new.rom"));
     EXPECT_EQ(withThisEtc(QUENXCTL, "install --target eth0 --force /etc/new.rom").status, 0);
     EXPECT_TRUE(std::filesystem::exists(etc / "quenx/adapters/eth0/state"));
+    etc.write("quenx/policy.toml", "[trust]\n");
+    EXPECT_THAT(withThisEtc(QUENXCTL, "install --target eth0 --force /etc/new.rom").error,
+                HasSubstr("The policy cannot be obeyed: /etc/quenx/policy.toml, line 1: "));
     // A forgotten description hides no card, which is out of reach here; one that is named is what is wanted.
     std::filesystem::create_directory(etc / "pci/0000:05:00.0");
     etc.write("pci/0000:05:00.0/class", "0x020000\n");
@@ -226,15 +240,15 @@ TEST_P(DaemonSessionTest, ShowsWhatIsWrittenDown) {
                             std::to_string(m_daemon.httpsPort()) + R"(
         ADMIN=http://admin:admin@$HTTP
         export QUENXCTL_PASSWORD=admin QUENXCTL_SOCKET=socket
-        here() { quenxctl --adapters adapters.toml --config provider.conf "$@"; }
+        here() { quenxctl --adapters adapters.toml --config provider.conf --policy policy.toml "$@"; }
         remote() { quenxctl --server https://$HTTPS --user admin --cacert cert.pem "$@"; }
         same() { here "$@" | sort >there; remote "$@" | sort | diff there - && test -s there; }
     )");
 }
 
 INSTANTIATE_TEST_SUITE_P(Shell, DaemonSessionTest,
-                         ::testing::Values("Held", "Interop", "Remote", "SameModel", "SecondDaemon",
-                                           "TwoFronts", "Update"),
+                         ::testing::Values("Held", "Interop", "Remote", "RemotePolicy", "SameModel",
+                                           "SecondDaemon", "TwoFronts", "Update"),
                          [](const auto& session) { return std::string(session.param); });
 
 }  // namespace

@@ -36,7 +36,9 @@ class Quenxctl : public ::testing::Test {
     /// The program, the options that make its environment, and the words of the line.
     virtual std::vector<std::string> command(const std::string& line) const {
         // Never the machine's own settings.
-        return withWordsOf(line, m_image, {QUENXCTL, "--adapters", m_adapters, "--config", m_defaults});
+        return withWordsOf(
+            line, m_image,
+            {QUENXCTL, "--adapters", m_adapters, "--config", m_defaults, "--policy", m_policy});
     }
     ProgramResult quenxctl(const std::string& line, const std::vector<std::string>& environment = {}) const {
         return run(command(line), environment);
@@ -63,6 +65,7 @@ class Quenxctl : public ::testing::Test {
     TempFolder m_folder;
     std::string m_adapters = m_folder.write("adapters.toml", kTestAdapters);
     std::string m_defaults = m_folder.write("default.conf", "");
+    std::string m_policy = m_folder.write("policy.toml", "");
     /// For eth0 and eth1: a real one with IMG_PXE 2 and IMG_UEFI 2.
     std::string m_image = m_folder.write("new.rom", withRevision(realRom("efi-virtio"), 2));
 };

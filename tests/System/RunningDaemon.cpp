@@ -19,6 +19,7 @@ RunningDaemon::RunningDaemon(const std::vector<std::string>& options,
     setPassword("admin");
     setPassword("guest", "--reader");
     m_folder.write("provider.conf", "");
+    m_folder.write("policy.toml", "");
     m_folder.write("adapters.toml", kTestAdapters);
     command.push_back(QUENX_CIMD);
     const std::pair<const char*, const char*> files[] = {{"--config", "quenx-cimd.toml"},
@@ -27,6 +28,7 @@ RunningDaemon::RunningDaemon(const std::vector<std::string>& options,
                                                          {"--listen-socket", "socket"},
                                                          {"--auth-users-file", "users"},
                                                          {"--providers-configuration", "provider.conf"},
+                                                         {"--providers-policy", "policy.toml"},
                                                          {"--adapters-description", "adapters.toml"},
                                                          {"--adapters-state", "state"},
                                                          {"--daemon-lock-file", "lock"}};

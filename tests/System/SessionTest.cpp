@@ -17,6 +17,7 @@ class SessionTest : public ::testing::TestWithParam<std::string> {
     SessionTest() {
         m_folder.write("adapters.toml", test::kTestAdapters);
         m_folder.write("default.conf", "");
+        m_folder.write("policy.toml", "");
         m_folder.write("old.rom", realRom("efi-virtio"));
         m_folder.write("new.rom", test::withRevision(realRom("efi-virtio"), 2));
         m_folder.write("rtl8139.rom", realRom("efi-rtl8139"));
@@ -40,6 +41,7 @@ TEST_P(SessionTest, ShowsWhatIsWrittenDown) {
         SOURCE=')" QUENX_SOURCE R"(' BUILD=')" QUENX_BUILD R"(' CMAKE=')" CMAKE R"('
         quenxctl() {
             case " $* " in *" --config "*) ;; *) set -- --config default.conf "$@" ;; esac
+            case " $* " in *" --policy "*) ;; *) set -- --policy policy.toml "$@" ;; esac
             command quenxctl --adapters adapters.toml "$@"
         }
     )");
@@ -47,8 +49,8 @@ TEST_P(SessionTest, ShowsWhatIsWrittenDown) {
 
 INSTANTIATE_TEST_SUITE_P(Shell, SessionTest,
                          ::testing::Values("BadFiles", "CommandLine", "ConfigCheck", "Daemon", "Domains",
-                                           "Help", "Identities", "Install", "Json", "Settings",
-                                           "Registration", "Staged", "UsersFile", "WrongImages"),
+                                           "Help", "Identities", "Install", "Json", "Policy", "Registration",
+                                           "Settings", "Staged", "UsersFile", "WrongImages"),
                          [](const auto& session) { return session.param; });
 
 }  // namespace

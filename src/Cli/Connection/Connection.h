@@ -30,12 +30,17 @@ struct Connection {
 /// The providers to load; an empty text leaves the choice to the system.
 struct ProviderSettings {
     std::string configFile;      ///< the providers' configuration file
+    std::string policyFile;      ///< the policy that they obey
+    bool isGuarded = false;      ///< the verb needs the leave of the policy
     ma::BackendChoice adapters;  ///< a state directory only with a description
     std::string directory;       ///< where the provider libraries are
 };
 
+/// The name of the user who runs this program, else the number.
+std::string localUser();
+
 /// Loads the providers into this process. Throws CommandError, naming the file, when one cannot be
-/// read or loaded.
+/// read or loaded, or when the verb needs a policy that cannot be obeyed; any other is only warned of it.
 Connection openProviders(const ProviderSettings& settings);
 
 /// The Unix socket of this machine's object manager: QUENXCTL_SOCKET, else its default.

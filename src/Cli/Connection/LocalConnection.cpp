@@ -1,14 +1,18 @@
 // SPDX-License-Identifier: Apache-2.0
+#include <pwd.h>
 #include <unistd.h>
 
 #include <cerrno>
 #include <cstdlib>
 #include <filesystem>
+#include <iostream>
 #include <optional>
 #include <system_error>
 
 #include "Cli/Connection/Connection.h"
 #include "Cli/Display/Messages.h"
+#include "Cli/Display/Terminal.h"
+#include "Framework/Requests/PolicyDecision.h"
 #include "Framework/Requests/ProviderSession.h"
 #include "MidAPI/ma.h"
 #include "Utils/Os/Linux/linux.h"
@@ -63,6 +67,26 @@ void selectAdapters(ma::BackendChoice adapters) {
     }
 }
 
+/// The session, and who uses it: the thread that opens it and gives it up.
+struct LocalSession {
+    explicit LocalSession(const ProviderSettings& settings)
+        : session(settings.configFile, settings.policyFile) {}
+
+    const core::CallerScope caller{{.principal = localUser()}};
+    core::ProviderSession session;
+};
+
+/// At once, and not after the image has been looked at.
+void requirePolicy(core::ProviderSession& session, const ProviderSettings& settings) {
+    const std::string problem = session.policy().problem();
+    if (problem.empty()) return;
+    const std::string text = "The policy cannot be obeyed: " + problem + ".";
+    if (settings.isGuarded)
+        throw CommandError(settings.policyFile.empty() ? ExitStatus::Failed : ExitStatus::WrongUse, text,
+                           kMendPolicy);
+    std::cerr << "quenxctl: Warning: " << printable(text) << '\n' << kMendPolicy << '\n';
+}
+
 void loadProviders(core::ProviderLibraries& providers, const std::string& named) {
     // The program's own directory is not something that the user got wrong.
     const ExitStatus status = named.empty() ? ExitStatus::Failed : ExitStatus::WrongUse;
@@ -87,15 +111,23 @@ void loadProviders(core::ProviderLibraries& providers, const std::string& named)
 
 }  // namespace
 
+std::string localUser() {
+    const uid_t id = ::getuid();
+    const passwd* entry = ::getpwuid(id);
+    return entry == nullptr ? std::to_string(id) : entry->pw_name;
+}
+
 Connection openProviders(const ProviderSettings& settings) {
     // The configuration ignores a file that it cannot read; a user who names one wants to hear of that.
     if (!settings.configFile.empty()) requireReadable(settings.configFile, "configuration file");
-    const auto session = std::make_shared<core::ProviderSession>(settings.configFile);
+    const auto local = std::make_shared<LocalSession>(settings);
+    core::ProviderSession* const session = &local->session;
+    requirePolicy(*session, settings);
     // The adapters first: providers may ask for them as soon as they are loaded.
     selectAdapters(settings.adapters);
     loadProviders(session->libraries(), settings.directory);
     // The operations share ownership with the session, so the libraries stay loaded while they can be called.
-    return {.operations = {session, session->operations().get()}, .isInProcess = true, .sharesFiles = true};
+    return {.operations = {local, session->operations().get()}, .isInProcess = true, .sharesFiles = true};
 }
 
 }  // namespace cli

@@ -28,6 +28,12 @@ enum class ExitStatus {
 /// The advice where the program knows no better.
 inline constexpr const char* kAskLog = "The system log may have the details.";
 
+/// The advice where a policy cannot be obeyed, on this machine or another.
+inline constexpr const char* kMendPolicy =
+    "Whoever administers the machine with the adapters has to mend that file; until then nothing is "
+    "installed "
+    "there.";
+
 /// What happened and what to do next, each one or two sentences. The advice may be empty.
 struct Explanation {
     std::string message;

@@ -1,9 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Cli/Update/Service.h"
 
-#include <pwd.h>
-#include <unistd.h>
-
 #include "Framework/Classes/RequestScope.h"
 #include "Framework/Requests/Audit.h"
 #include "Providers/Schema/ProviderInterfaces.h"
@@ -49,12 +46,6 @@ core::Argument reference(const std::string& name, const core::CimPath& path) {
 core::Argument imageOf(const Candidate& candidate) {
     if (candidate.identity.isValid()) return reference("Source", candidate.identity);
     return {"URI", core::CimValue::of(core::CimType::String, candidate.uri)};
-}
-
-std::string localUser() {
-    const uid_t id = ::getuid();
-    const passwd* entry = ::getpwuid(id);
-    return entry == nullptr ? std::to_string(id) : entry->pw_name;
 }
 
 /// A call of the service, as the methods take it.

@@ -11,6 +11,7 @@
 #include "Framework/Model/CimInstance.h"
 #include "Framework/Model/CimPropertyList.h"
 #include "Framework/Requests/AnswerMeter.h"
+#include "Framework/Requests/PolicyDecision.h"
 #include "Framework/Requests/ServedClasses.h"
 #include "Utils/Exception.h"
 
@@ -131,6 +132,7 @@ InstanceValue CimRequests::getInstance(const CimPath& path, const PropertyFilter
 
 void CimRequests::deleteInstance(const CimPath& path) {
     answerRequest(m_namespace, [&](const ServedClasses& classes) {
+        const PolicyDecision decision;
         CimPath typed = classes.typed(path);
         bool isSupported = false;
         for (const ServedClass* each : classes.named(typed.getClassName())) {
@@ -154,6 +156,8 @@ void CimRequests::deleteInstance(const CimPath& path) {
 MethodResult CimRequests::invokeMethod(const CimPath& path, const std::string& method,
                                        const std::vector<Argument>& arguments) {
     return answerRequest(m_namespace, [&](const ServedClasses& classes) -> MethodResult {
+        // Before anything else: one who may not learns nothing of what there is to call.
+        const PolicyDecision decision;
         const ClassChain chain = classes.chainOf(path.getClassName());
         // Not InvalidClass, which DSP0200 does not list for extrinsic methods.
         if (chain.empty()) {

@@ -8,7 +8,8 @@ namespace core {
 /// The request layer: what the providers loaded into this process answer. Every front (`quenxctl` in process,
 /// `quenx-cimd`) calls it. Classes are served in one namespace; a path of another one names nothing. Each
 /// operation is a request scope of its own; an exception out of a provider becomes CimStatus::Failed with its
-/// text.
+/// text. Methods and deletions need the leave of the policy (see PolicyDecision), and are refused with
+/// CimStatus::AccessDenied without it.
 class QUENX_EXPORT CimRequests : public CimOperations {
   public:
     explicit CimRequests(std::string namespaceName);

@@ -74,10 +74,13 @@ void ProviderLibraries::load(const std::string& directory) {
     }
 }
 
-ProviderSession::ProviderSession(const std::string& configurationFile) {
+ProviderSession::ProviderSession(const std::string& configurationFile, const std::string& policyFile)
+    : m_policy(policyFile) {
     // Constructed first, since whoever asks for the current configuration from here on gets this one.
     if (!configurationFile.empty()) m_configuration.emplace(configurationFile);
     m_operations = std::make_shared<CimRequests>(utils::SMASHv2Config::getInstance()->getNamespace());
+    // For the log: who has made a mistake is to hear of it before somebody needs an update.
+    m_policy.problem();
 }
 
 }  // namespace core

@@ -8,6 +8,7 @@
 
 #include "Framework/Requests/CimOperations.h"
 #include "Utils/Os/Linux/LinuxOSLocker.h"
+#include "Utils/Os/Linux/PolicyFile.h"
 #include "Utils/Os/Linux/SMASHv2Config.h"
 
 namespace core {
@@ -51,21 +52,26 @@ class QUENX_EXPORT ProviderLibraries {
     std::vector<Problem> m_problems;
 };
 
-/// What every front holds while it serves: the providers' configuration, the locker under which they write to
-/// adapters, and their libraries. Leaving waits for the updates that have begun. One at a time in a process;
-/// used from one thread, but for the operations.
+/// What every front holds while it serves: the providers' configuration, the policy that they obey, the
+/// locker under which they write to adapters, and their libraries. Leaving waits for the updates that have
+/// begun. One at a time in a process; used from one thread, but for the operations.
 ///
 /// Which adapters there are is not its affair: a front that wants simulated ones says so to the adapter API
 /// before it loads the providers.
 class QUENX_EXPORT ProviderSession {
   public:
     /// @param configurationFile  empty for the system's
-    explicit ProviderSession(const std::string& configurationFile);
+    /// @param policyFile         empty for the system's; see utils::PolicyFile. A bad one is logged, and
+    ///                           refuses what a policy guards
+    explicit ProviderSession(const std::string& configurationFile, const std::string& policyFile = {});
     ProviderSession(const ProviderSession&) = delete;
     ProviderSession& operator=(const ProviderSession&) = delete;
 
     /// Loads the providers of a directory, see ProviderLibraries::load().
     ProviderLibraries& libraries() { return m_libraries; }
+
+    /// What is obeyed. Any thread may ask.
+    utils::PolicyFile& policy() { return m_policy; }
 
     /// What the loaded providers answer, in the namespace that the configuration names. Shared with whatever
     /// stands in front of them.
@@ -74,6 +80,7 @@ class QUENX_EXPORT ProviderSession {
   private:
     // Destroyed last to first: the providers leave before what they use.
     std::optional<utils::SMASHv2Config> m_configuration;
+    utils::PolicyFile m_policy;
     os::OSLockerLinux m_locker;
     ProviderLibraries m_libraries;
     std::shared_ptr<CimOperations> m_operations;

@@ -14,6 +14,7 @@
 #include "Host/Server/LocalSocket.h"
 #include "Host/Server/ServerCertificate.h"
 #include "MidAPI/ma.h"
+#include "Utils/Os/Linux/PolicyFile.h"
 #include "Utils/Os/Linux/linux.h"
 
 namespace host {
@@ -141,6 +142,7 @@ int checkConfiguration(const Settings& settings) {
     if (listen.https) check([&] { checkTls(settings.tls); });
     check([&] { checkAuthentication(settings.authentication); });
     check([&] { checkProviderConfiguration(settings.providerConfiguration); });
+    check([&] { utils::PolicyFile(settings.policy).current(); });
     check([&] { checkProviders(settings); });
     check([&] { checkAdapters(settings); });
     if (status == 0) std::cout << "The configuration is valid.\n";

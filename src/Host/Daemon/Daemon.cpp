@@ -108,8 +108,11 @@ ma::BackendChoice adaptersOf(const Settings& settings) {
 }
 
 Daemon::Daemon(const Settings& settings)
-    : m_settings(settings), m_lock(settings.lockFile), m_session(settings.providerConfiguration) {
+    : m_settings(settings),
+      m_lock(settings.lockFile),
+      m_session(settings.providerConfiguration, settings.policy) {
     m_lock.require();
+    reportPolicy();
     for (const std::string& text : warningsOf(settings, raiseDescriptors(settings)))
         reportProblem("Warning: " + text);
     // Before the providers come, which ask for the adapters as soon as they are called.
@@ -187,6 +190,13 @@ void Daemon::listen() {
     }
 }
 
+void Daemon::reportPolicy() {
+    const std::string problem = m_session.policy().problem();
+    if (!problem.empty())
+        report("The policy cannot be obeyed, and nothing is installed or deleted until it is mended: " +
+               problem);
+}
+
 void Daemon::reload() {
     const auto again = [](const std::string& what, const auto& read) {
         try {
@@ -200,6 +210,7 @@ void Daemon::reload() {
     again("users", [this] { m_authentication->reload(); });
     m_server->doubtLogins();
     if (m_settings.listen.https) again("certificate and key", [this] { readCertificate(); });
+    reportPolicy();
 }
 
 void Daemon::stopAccepting() {

@@ -78,6 +78,8 @@ class Daemon {
     std::unique_ptr<Dispatcher> makeDispatcher() const;
     std::unique_ptr<Authentication> makeAuthentication() const;
     void readCertificate();
+    /// A bad policy stops no reader; the session logs it.
+    void reportPolicy();
     void listen();
     void listenOn(std::uint16_t port, bool tls);
 

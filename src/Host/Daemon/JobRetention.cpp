@@ -4,6 +4,7 @@
 #include <algorithm>
 
 #include "Framework/Requests/Audit.h"
+#include "Framework/Requests/PolicyDecision.h"
 #include "Host/Repetition.h"
 #include "Providers/Schema/ValueMaps.h"
 
@@ -61,6 +62,7 @@ JobRetention::JobRetention(const JobSettings& settings, std::shared_ptr<core::Ci
 }
 
 void JobRetention::sweep() {
+    const core::CallerScope scope({.principal = "quenx-cimd", .isFront = true});
     const auto jobs = m_operations->enumerateInstances(kJobClass, {{"JobState"}});
     for (const auto& [path, setting] : m_jobs.look(jobs, EndedJobs::Clock::now())) {
         std::string outcome = "done";

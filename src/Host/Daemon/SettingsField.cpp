@@ -113,6 +113,8 @@ std::vector<SettingsField> otherFields(Settings& s) {
             {"providers.directory", &s.providers, 0, 0, "directory of the provider libraries"},
             {"providers.configuration", &s.providerConfiguration, 0, 0,
              "the providers' own configuration file, instead of /etc/quenx-cimprovider.conf"},
+            {"providers.policy", &s.policy, 0, 0,
+             "file that says who may install and delete, instead of /etc/quenx/policy.toml"},
             {"adapters.backend", &s.backend, 1, 0,
              "which adapters: devlink for this machine's own, simulator or auto; instead of QUENX_BACKEND"},
             {"adapters.description", &s.adapters, 1, 0,

@@ -6,6 +6,7 @@
 #include <utility>
 
 #include "Framework/Requests/Audit.h"
+#include "Framework/Requests/PolicyDecision.h"
 
 namespace host {
 
@@ -126,6 +127,7 @@ cimxml::Response Dispatcher::carryOut(const cimxml::Request& request, const Call
     response.host = caller.host;
     const ChargingMeter meter(charge);
     try {
+        const core::CallerScope scope({.principal = caller.user});
         if (m_shuttingDown.load()) {
             throw CimError(CimStatus::ServerIsShuttingDown, "the server is shutting down");
         }

@@ -2,6 +2,7 @@
 #include "Providers/SoftwareUpdate/Quenx_ConcreteJobClass.h"
 
 #include "Framework/Classes/RequestScope.h"
+#include "Framework/Requests/PolicyDecision.h"
 #include "Providers/SoftwareUpdate/MethodResults.h"
 
 namespace {
@@ -76,7 +77,8 @@ int Quenx_ConcreteJobClass::createJob(UpdateOrder& order, Quenx_ConcreteJob*& jo
 
 int Quenx_ConcreteJobClass::DeleteInstance(core::CimPath& path) {
     QUENX_DEBUG("DeleteInstance");
-    const core::RequestScope scope;  // another request may delete the same job meanwhile
+    const core::PolicyDecision decision;  // for callers that come without the request layer
+    const core::RequestScope scope;       // another request may delete the same job meanwhile
     QUENX_DEBUG("All jobs: %d", static_cast<int>(m_instances.size()));
     Quenx_ConcreteJob* job = nullptr;
     try {

@@ -4,6 +4,7 @@
 #include <algorithm>
 
 #include "Framework/Classes/RequestScope.h"
+#include "Framework/Requests/PolicyDecision.h"
 #include "Providers/SoftwareUpdate/MethodArguments.h"
 #include "Providers/SoftwareUpdate/Quenx_ConcreteJobClass.h"
 #include "Utils/Os/Linux/linux.h"
@@ -62,6 +63,7 @@ std::optional<unsigned int> checkTargetAndCollection(const MethodArguments& in, 
 template <class OnSuccess>
 unsigned int carryOut(const MethodKind& kind, const core::CimPath* source, const core::CimPath& target,
                       UpdateOrder order, OnSuccess&& onSuccess) {
+    const core::PolicyDecision decision;  // for callers that come without the request layer
     if (const auto refused = resolve(kind, source, target, order)) return *refused;
     // Not within the try: a registry that is missing is a mistake in the program, and is to be seen as one.
     Quenx_ConcreteJobClass& registry = jobRegistry();

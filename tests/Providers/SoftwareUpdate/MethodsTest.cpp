@@ -6,12 +6,15 @@
 
 #include "Framework/Classes/CimBroker.h"
 #include "Framework/Classes/RequestScope.h"
+#include "Framework/Requests/PolicyDecision.h"
 #include "MidAPI/Image/RomFormat.h"
 #include "Providers/ClassObjects.h"
 #include "Providers/Schema/CIM_PortController.h"
 #include "Providers/Schema/ProviderInterfaces.h"
+#include "Providers/SoftwareUpdate/Quenx_ConcreteJobClass.h"
 #include "Providers/SoftwareUpdate/UpdateTest.h"
 #include "Support/TestRoms.h"
+#include "Utils/Os/Linux/PolicyFile.h"
 #include "Utils/Utils.h"
 
 namespace {
@@ -254,6 +257,42 @@ TEST_F(SiblingsTest, AControllerIsAskedWhatItHoldsWhereverItSits) {
     };
     EXPECT_EQ(affected("Quenx_AffectedJobElement"), 1U);
     EXPECT_EQ(affected("Quenx_ServiceAffectsElement"), 1U);
+}
+
+TEST_F(MethodsTest, AsksThePolicyBeforeAnythingIsClaimed) {
+    const std::string install = expanded(kInstall + "5");
+    const auto errorFor = [&](core::Caller caller) {
+        const core::CallerScope scope(std::move(caller));
+        const CallResult result = call("InstallFromURI", install.substr(install.find(';') + 2));
+        if (!result.error.empty()) {
+            EXPECT_EQ(claim(), "");
+            CimPath none("Quenx_ConcreteJob", {{"InstanceID", "none"}});
+            EXPECT_THROW(Quenx_ConcreteJobClass().DeleteInstance(none), core::CimError);
+        } else {
+            waitForEnd(*result.job);
+            deleteJobs();
+        }
+        return result.error;
+    };
+    const std::string file = m_folder.write("policy.toml", "administrators = [\"alice\"]\n");
+    const char* const machines = utils::systemPolicyFile.exchange(file.c_str());
+    // This process has no session, so it cannot tell whom to obey.
+    EXPECT_EQ(errorFor({"alice"}), "nothing can be installed or deleted here: there is a policy, " + file +
+                                       ", and the program that loaded this provider cannot obey it; use "
+                                       "quenxctl, quenx-cimd or libQuenx_Cmpi.so");
+    utils::systemPolicyFile = machines;
+    utils::PolicyFile policy(file);
+    EXPECT_EQ(errorFor({"alice"}), "");
+    EXPECT_EQ(errorFor({"quenx-cimd", true}), "");
+    const std::string place = "\"administrators\" in " + file + ", line 1, ";
+    EXPECT_EQ(errorFor({"bob"}), "user \"bob\" may only read: " + place + "has no such name");
+    EXPECT_EQ(errorFor({}), "a caller without a name may only read: " + place + "is set");
+    m_folder.write("policy.toml", "\n\nadministrators = [\"alice\", 5]\n");
+    EXPECT_EQ(errorFor({"alice"}),
+              "nothing can be installed or deleted until the policy is mended: " + file +
+                  ", line 3: the policy: \"administrators\" must be a list of user names, such as "
+                  "[\"root\", \"alice\"]");
+    EXPECT_FALSE(m_requests.enumerateInstances("Quenx_EthernetPort").empty());
 }
 
 }  // namespace

@@ -1,0 +1,58 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include <memory>
+#include <string>
+#include <string_view>
+
+#include "Utils/Export.h"
+#include "Utils/Policy.h"
+
+namespace core {
+
+/// Who asks, as a front knows it.
+struct Caller {
+    std::string principal;  ///< the user's name; empty where nobody said one
+    bool isFront = false;   ///< the front itself, which does what its own settings say
+};
+
+/// Says who asks on the calling thread for the length of a scope. Without one the caller has no name.
+class QUENX_EXPORT CallerScope {
+  public:
+    explicit CallerScope(Caller caller);
+    CallerScope(const CallerScope&) = delete;
+    CallerScope& operator=(const CallerScope&) = delete;
+    ~CallerScope();
+
+    /// The calling thread's.
+    static const Caller& current();
+
+  private:
+    const Caller m_caller;
+    const CallerScope* const m_outer;
+};
+
+/// The beginning of a refusal by a policy that cannot be obeyed.
+inline constexpr std::string_view kBadPolicy = "nothing can be installed or deleted";
+
+/// Leave to do what the policy guards: to call a method, to delete an instance. Asked for on the stack before
+/// anything is claimed or changed. All that a call decides, it decides by the snapshot of its first decision:
+/// one inside another on a thread asks nothing more.
+///
+/// A process with a front's session obeys the file that the session has; in any other one, a policy on the
+/// machine refuses all, since nobody there says who calls.
+class QUENX_EXPORT PolicyDecision {
+  public:
+    /// @throws CimError (access denied) for a caller who may not, and where the policy cannot be obeyed; the
+    /// text says why, and what would be right
+    PolicyDecision();
+    PolicyDecision(const PolicyDecision&) = delete;
+    PolicyDecision& operator=(const PolicyDecision&) = delete;
+    ~PolicyDecision();
+
+  private:
+    const bool m_isOutermost;
+    std::shared_ptr<const utils::Policy> m_policy;  ///< null without a session
+};
+
+}  // namespace core

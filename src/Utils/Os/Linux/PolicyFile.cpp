@@ -1,0 +1,135 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "Utils/Os/Linux/PolicyFile.h"
+
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <array>
+#include <cerrno>
+#include <filesystem>
+#include <system_error>
+
+#include "Utils/Log.h"
+#include "Utils/Os/Linux/linux.h"
+
+namespace utils {
+
+std::atomic<const char*> systemPolicyFile{"/etc/quenx/policy.toml"};
+
+namespace {
+
+constexpr std::size_t kLargest = std::size_t{1} << 20;
+
+std::atomic<PolicyFile*> newest{nullptr};
+
+[[noreturn]] void refuse(const std::string& path, const std::string& what) {
+    throw PolicyError(path + ": " + what);
+}
+
+[[noreturn]] void refuseReading(const std::string& path, int error) {
+    refuse(path, "cannot be read: " + std::generic_category().message(error) +
+                     "; let the user of this program read it, or remove it");
+}
+
+/// Whoever owns something can write to it, whatever its mode is now.
+void requireOwn(const std::string& path, const os::Descriptor& opened, const std::string& subject,
+                const std::string& name) {
+    struct stat status {};
+    if (::fstat(opened.number(), &status) != 0) refuseReading(path, errno);
+    if (status.st_uid != 0 && status.st_uid != ::geteuid())
+        refuse(path, subject + " belongs to user " + std::to_string(status.st_uid) +
+                         ", who could change it; run: chown root " + name);
+    if ((status.st_mode & (S_IWGRP | S_IWOTH)) != 0)
+        refuse(path, subject + " can be changed by others than its owner; run: chmod go-w " + name);
+}
+
+std::string textOf(const std::string& path, const os::Descriptor& file) {
+    std::string text;
+    std::array<char, 4096> piece;
+    while (text.size() <= kLargest) {
+        const ssize_t got = ::read(file.number(), piece.data(), piece.size());
+        if (got < 0 && errno == EINTR) continue;
+        if (got < 0) refuseReading(path, errno);
+        if (got == 0) return text;
+        text.append(piece.data(), static_cast<std::size_t>(got));
+    }
+    refuse(path, "it is larger than 1 MiB; put only the keys of a policy there");
+}
+
+/// Nothing when there is no such file. The folder is opened first and the file in it, so that what was looked
+/// at is what is read.
+std::optional<std::string> readSafely(const std::string& path) {
+    const std::filesystem::path whole = std::filesystem::absolute(path);
+    const std::string place = whole.parent_path().string();
+    const os::Descriptor folder(::open(place.c_str(), O_PATH | O_DIRECTORY | O_CLOEXEC));
+    if (!folder.isOpen() && errno == ENOENT) return std::nullopt;
+    if (!folder.isOpen()) refuseReading(path, errno);
+    constexpr int kFlags = O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY | O_CLOEXEC;
+    const os::Descriptor file(::openat(folder.number(), whole.filename().c_str(), kFlags));
+    if (!file.isOpen() && errno == ENOENT) return std::nullopt;
+    if (!file.isOpen() && errno == ELOOP)
+        refuse(path, "it is a symbolic link, which others may turn; put the file itself there");
+    if (!file.isOpen()) refuseReading(path, errno);
+    struct stat status {};
+    if (::fstat(file.number(), &status) != 0) refuseReading(path, errno);
+    if (!S_ISREG(status.st_mode)) refuse(path, "it is not a regular file; put a file there, or nothing");
+    requireOwn(path, folder, "its folder", place);
+    requireOwn(path, file, "it", path);
+    return textOf(path, file);
+}
+
+}  // namespace
+
+PolicyFile::PolicyFile(const std::string& path)
+    : m_path(path.empty() ? systemPolicyFile.load() : path), m_isNamed(!path.empty()), m_outer(newest) {
+    newest = this;
+}
+
+PolicyFile::~PolicyFile() {
+    newest = m_outer;
+}
+
+std::shared_ptr<const Policy> PolicyFile::current() {
+    const Mutex::AutoLocker lock(m_mutex);
+    try {
+        m_policy = read();
+        m_problem.clear();
+    } catch (const PolicyError& error) {
+        m_policy.reset();
+        if (m_problem != error.what()) {
+            m_problem = error.what();
+            QUENX_ERROR_TEXT("The policy cannot be obeyed, and nothing is installed or deleted: " +
+                             m_problem);
+        }
+        throw;
+    }
+    return m_policy;
+}
+
+std::shared_ptr<const Policy> PolicyFile::read() {
+    std::optional<std::string> text = readSafely(m_path);
+    if (!text && m_isNamed) refuse(m_path, "there is no such file; write it, or name another one");
+    if (m_policy != nullptr && text == m_text) return m_policy;
+    auto policy = std::make_shared<const Policy>(text ? parsePolicy(*text, m_path) : Policy());
+    m_text = std::move(text);
+    return policy;
+}
+
+std::string PolicyFile::problem() try {
+    current();
+    return "";
+} catch (const PolicyError& error) {
+    return error.what();
+}
+
+PolicyFile* PolicyFile::ofProcess() noexcept {
+    return newest;
+}
+
+bool PolicyFile::isOnMachine() noexcept {
+    struct stat status {};
+    return ::lstat(systemPolicyFile.load(), &status) == 0 || errno != ENOENT;
+}
+
+}  // namespace utils

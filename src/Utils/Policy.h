@@ -1,0 +1,36 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include <optional>
+#include <stdexcept>
+#include <string>
+#include <string_view>
+#include <vector>
+
+#include "Utils/Export.h"
+
+namespace utils {
+
+/// A policy that cannot be obeyed. what() names the file, the line if it has one, and what would be right.
+class QUENX_EXPORT PolicyError : public std::runtime_error {
+  public:
+    using std::runtime_error::runtime_error;
+    PolicyError(const PolicyError&) = default;
+    PolicyError& operator=(const PolicyError&) = default;
+    ~PolicyError() override;
+};
+
+/// What the administrators of a machine want kept to, as one reading of their file has it. Whatever is absent
+/// restricts nothing.
+struct Policy {
+    /// Who may call methods and delete instances. The list is complete: root has to be in it, too.
+    std::optional<std::vector<std::string>> administrators;
+    std::string administratorsPlace;  ///< "/etc/quenx/policy.toml, line 3"
+};
+
+/// Reads the text of a policy, whole: a key that nothing here obeys would promise what nobody keeps.
+/// @param fileName  for the texts
+/// @throws PolicyError
+QUENX_EXPORT Policy parsePolicy(std::string_view text, const std::string& fileName);
+
+}  // namespace utils
