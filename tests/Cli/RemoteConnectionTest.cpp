@@ -221,7 +221,7 @@ TEST(RemoteConnectionTest, SaysWhatAnHttpStatusMeans) {
          "CIM-XML server; its log has the details."},
     };
     for (const auto& [head, said] : table) {
-        const ToldServer server([&](int client, const std::string&) {
+        const ToldServer server([&head = head](int client, const std::string&) {
             ToldServer::sendBytes(client, "HTTP/1.1 " + std::string(head) +
                                               "\r\nConnection: close\r\nContent-Length: 0\r\n\r\n");
         });
