@@ -62,7 +62,7 @@ std::optional<KnownFunction> AdapterTable::find(const std::string& name, Ask ask
     }
     if (!found) return std::nullopt;
     // The kernel tells that somebody is flashing it, but not who.
-    if (found->known.writer == kSomebody)
+    if (found->known.writer == kSomebody && ask != Ask::AnewAsHolder)
         if (auto holder = findLockHolder(found->known.pci); !holder.empty()) found->known.writer = holder;
     if (!found->mustBeAsked) return found->known;
     if (ask != Ask::AnewAsHolder) found->known.writer = findLockHolder(found->known.pci);

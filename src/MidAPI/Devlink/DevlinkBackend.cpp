@@ -208,6 +208,8 @@ KnownFunction DevlinkBackend::readUnderLock(const std::string& adapter) {
     if (!known) throw OperationFailure(ENODEV, "adapter " + adapter + " is gone");
     const std::string flashed = m_table.findFlashedElsewhere(*known);
     if (!flashed.empty()) refuseAsBusy("function " + flashed + " of the card", "another program");
+    // It has just ended, and what is known is of before.
+    if (!known->writer.empty()) refuseAsBusy("the card of adapter " + adapter, known->writer);
     requireFlashable(*known);
     return *std::move(known);
 }
