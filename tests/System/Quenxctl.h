@@ -65,7 +65,7 @@ class Quenxctl : public ::testing::Test {
     TempFolder m_folder;
     std::string m_adapters = m_folder.write("adapters.toml", kTestAdapters);
     std::string m_defaults = m_folder.write("default.conf", "");
-    std::string m_policy = m_folder.write("policy.toml", "");
+    std::string m_policy = m_folder.write("policy.toml", "# As if there were none.\n");
     /// For eth0 and eth1: a real one with IMG_PXE 2 and IMG_UEFI 2.
     std::string m_image = m_folder.write("new.rom", withRevision(realRom("efi-virtio"), 2));
 };

@@ -19,7 +19,7 @@ RunningDaemon::RunningDaemon(const std::vector<std::string>& options,
     setPassword("admin");
     setPassword("guest", "--reader");
     m_folder.write("provider.conf", "");
-    m_folder.write("policy.toml", "");
+    m_folder.write("policy.toml", "# As if there were none.\n");
     m_folder.write("adapters.toml", kTestAdapters);
     command.push_back(QUENX_CIMD);
     const std::pair<const char*, const char*> files[] = {{"--config", "quenx-cimd.toml"},

@@ -17,7 +17,7 @@ class SessionTest : public ::testing::TestWithParam<std::string> {
     SessionTest() {
         m_folder.write("adapters.toml", test::kTestAdapters);
         m_folder.write("default.conf", "");
-        m_folder.write("policy.toml", "");
+        m_folder.write("policy.toml", "# As if there were none.\n");
         m_folder.write("old.rom", realRom("efi-virtio"));
         m_folder.write("new.rom", test::withRevision(realRom("efi-virtio"), 2));
         m_folder.write("rtl8139.rom", realRom("efi-rtl8139"));

@@ -71,6 +71,8 @@ void JobRetention::sweep() {
         } catch (const core::CimError& error) {
             // A client deleted it meanwhile.
             if (error.status() == core::CimStatus::NotFound) continue;
+            // A policy that cannot be obeyed, of which the log has a line.
+            if (error.status() == core::CimStatus::AccessDenied) return;
             outcome = core::outcomeOf(error.status(), error.what());
         }
         const auto rule = core::CimValue::of(core::CimType::String, setting);

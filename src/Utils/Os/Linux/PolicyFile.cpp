@@ -51,6 +51,8 @@ std::string textOf(const std::string& path, const os::Descriptor& file) {
         const ssize_t got = ::read(file.number(), piece.data(), piece.size());
         if (got < 0 && errno == EINTR) continue;
         if (got < 0) refuseReading(path, errno);
+        // Who writes into the file in place, and not beside it, would allow everything until he is done.
+        if (got == 0 && text.empty()) refuse(path, "it is empty; write the policy there, or remove it");
         if (got == 0) return text;
         text.append(piece.data(), static_cast<std::size_t>(got));
     }
@@ -60,18 +62,19 @@ std::string textOf(const std::string& path, const os::Descriptor& file) {
 /// Nothing when there is no such file. The folder is opened first and the file in it, so that what was looked
 /// at is what is read.
 std::optional<std::string> readSafely(const std::string& path) {
+    struct stat status {};
+    // Before anything is opened: where no descriptor is free, a file that is not there could not be opened,
+    // either.
+    if (::lstat(path.c_str(), &status) != 0 && errno == ENOENT) return std::nullopt;
     const std::filesystem::path whole = std::filesystem::absolute(path);
     const std::string place = whole.parent_path().string();
     const os::Descriptor folder(::open(place.c_str(), O_PATH | O_DIRECTORY | O_CLOEXEC));
-    if (!folder.isOpen() && errno == ENOENT) return std::nullopt;
     if (!folder.isOpen()) refuseReading(path, errno);
     constexpr int kFlags = O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY | O_CLOEXEC;
     const os::Descriptor file(::openat(folder.number(), whole.filename().c_str(), kFlags));
-    if (!file.isOpen() && errno == ENOENT) return std::nullopt;
     if (!file.isOpen() && errno == ELOOP)
         refuse(path, "it is a symbolic link, which others may turn; put the file itself there");
     if (!file.isOpen()) refuseReading(path, errno);
-    struct stat status {};
     if (::fstat(file.number(), &status) != 0) refuseReading(path, errno);
     if (!S_ISREG(status.st_mode)) refuse(path, "it is not a regular file; put a file there, or nothing");
     requireOwn(path, folder, "its folder", place);
