@@ -3,6 +3,7 @@
 #include "Cmpi/EntryPoints.h"
 #include "Cmpi/Request.h"
 #include "Cmpi/Slots.h"
+#include "Utils/Utils.h"
 
 namespace cmpi {
 
@@ -23,7 +24,8 @@ struct Narrowing {
 /// often.
 /// @param association  narrowed to that class; false when that one is not below it
 bool narrowToRegistration(const Request& request, std::string& association) {
-    const std::string registered = request.contextEntry("sfcbProviderParameters");
+    const std::string parameters = request.contextEntry("sfcbProviderParameters");
+    const std::string registered(utils::trimOf(parameters, " \t\r\n"));
     const core::ClassChain chain = request.operations().getClass(registered);
     if (chain.empty() || !core::isAssociation(chain)) return true;
     if (!association.empty() && !core::derivesFrom(chain, association)) return false;

@@ -31,29 +31,35 @@ class Temporaries {
     void* m_mark = nullptr;
 };
 
+/// The lists of names by which an instance is filtered. Object managers may go on looking at them, so they
+/// have to outlive it.
+struct FilterNames {
+    std::vector<const char*> wanted;
+    std::vector<const char*> keys;
+};
+
 /// The properties that the client gets. Given to the instance before anything is set, as object managers
 /// want it.
-void setFilter(Instance* instance, const core::InstanceValue& value, const core::PropertyFilter& filter) {
-    std::vector<const char*> names;
+void setFilter(Instance* instance, const core::InstanceValue& value, const core::PropertyFilter& filter,
+               FilterNames& names) {
     for (const std::string& name : *filter)
-        names.push_back(name.c_str());
-    names.push_back(nullptr);
-    std::vector<const char*> keys;
+        names.wanted.push_back(name.c_str());
+    names.wanted.push_back(nullptr);
     for (const core::PropertyValue& property : value.properties) {
-        if (property.isKey) keys.push_back(property.name.c_str());
+        if (property.isKey) names.keys.push_back(property.name.c_str());
     }
-    keys.push_back(nullptr);
-    call(instance, &InstanceTable::setPropertyFilter, names.data(), keys.data());
+    names.keys.push_back(nullptr);
+    call(instance, &InstanceTable::setPropertyFilter, names.wanted.data(), names.keys.data());
 }
 
 Instance* newInstance(const Place& place, const core::InstanceValue& value,
-                      const core::PropertyFilter& filter) {
+                      const core::PropertyFilter& filter, FilterNames& names) {
     Instance* instance = call(place.broker, place.broker.eft, &BrokerEncTable::newInstance,
                               newPath(place, value.path), nullptr);
     if (instance == nullptr)
         throw CimError(CimStatus::Failed,
                        "the object manager could not make an instance of " + value.path.getClassName());
-    if (filter) setFilter(instance, value, filter);
+    if (filter) setFilter(instance, value, filter, names);
     const core::WantedProperties wanted(filter);
     for (const core::PropertyValue& property : value.properties) {
         if (!property.isKey && !wanted.includes(property.name)) continue;
@@ -91,8 +97,9 @@ void Request::give(const core::CimPath& path) {
 }
 
 void Request::give(const core::InstanceValue& instance, const core::PropertyFilter& filter) {
+    FilterNames names;
     const Temporaries temporaries(m_place.broker);
-    take(call(m_sender.result, &ResultTable::returnInstance, newInstance(m_place, instance, filter)));
+    take(call(m_sender.result, &ResultTable::returnInstance, newInstance(m_place, instance, filter, names)));
 }
 
 void Request::give(core::CimType type, const core::CimScalar& value) {

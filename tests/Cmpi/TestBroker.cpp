@@ -138,8 +138,7 @@ constexpr auto kCount = [](auto* object, Status*) { return cmpi::Count(at(object
 constexpr auto kSet = [](auto* object, const char* name, const Value* value, Type type) {
     Node& node = at(object);
     std::erase_if(node.entries, [&](const Entry& entry) { return core::sameName(entry.name, name); });
-    const bool isWanted = core::WantedProperties(node.filter).includes(name);
-    if (isWanted) node.entries.emplace_back(name, valueOf(value, type));
+    node.entries.emplace_back(name, valueOf(value, type));
     return kDone();
 };
 
@@ -150,10 +149,26 @@ void forbidClones(Table& table, Status (*Table::*release)(Object*)) {
     table.clone = [](const Object*, Status*) -> Object* { die("cloned"); };
 }
 
+/// Older object managers give the keys, too.
+core::PropertyFilter filterOf(const Node& instance) {
+    const auto& [properties, keys] = instance.filter;
+    if (properties == nullptr) return std::nullopt;
+    std::vector<std::string> filter;
+    for (const char** names : {properties, now().broker.isSfcb ? keys : nullptr}) {
+        for (; names != nullptr && *names != nullptr; ++names)
+            filter.emplace_back(*names);
+    }
+    return filter;
+}
+
 void giveInstance(const Node& instance) {
     core::InstanceValue value{pathOf(instance, instance.keys), {}};
-    for (const Entry& property : instance.entries)
-        value.properties.push_back({property.name, property.value, false, {}});
+    const core::PropertyFilter filter = filterOf(instance);
+    const core::WantedProperties wanted(filter);
+    for (const Entry& property : instance.entries) {
+        if (wanted.includes(property.name))
+            value.properties.push_back({property.name, property.value, false, {}});
+    }
     now().answers.instances.push_back(std::move(value));
 }
 
@@ -162,14 +177,10 @@ void giveNumber(const CimValue& value) {
     now().answers.called = {number, {}, value.type};
 }
 
-/// Older object managers give the keys, too.
+/// Looked at when the instance is given, as managers may.
 void setFilter(Node& instance, const char** properties, const char** keys) {
     if (!instance.entries.empty()) die("a filter after a property");
-    instance.filter.emplace();
-    for (const char** names : {properties, now().broker.isSfcb ? keys : nullptr}) {
-        for (; names != nullptr && *names != nullptr; ++names)
-            instance.filter->emplace_back(*names);
-    }
+    instance.filter = {properties, keys};
 }
 
 }  // namespace

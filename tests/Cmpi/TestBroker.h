@@ -36,8 +36,8 @@ struct Node {
     std::string text;  ///< of a string or a datetime; the namespace of a path, also of an instance's
     std::string className = {};
     std::vector<Entry> entries = {};
-    std::vector<Entry> keys = {};  ///< of an instance
-    core::PropertyFilter filter = {};
+    std::vector<Entry> keys = {};                       ///< of an instance
+    std::pair<const char**, const char**> filter = {};  ///< of an instance: what is wanted, and its keys
     bool isAlive = true;
 
     template <class Handle>
