@@ -106,7 +106,13 @@ Registration pegasusRemoval(const Registered& registered) {
     const std::string text =
         "#!/bin/sh\n" +
         headLine("#", "takes its registration and classes out of OpenPegasus. It may be repeated.") +
-        "set -e\n" + "if cimprovider -l | grep -qx " + name + "; then\n    cimprovider -d -m " + name +
+        "set -e\n"
+        "modules=$(cimprovider -l) || {\n"
+        "    echo \"The object manager does not answer. Start it, and run this again.\" >&2\n"
+        "    exit 1\n"
+        "}\n"
+        "if printf '%s\\n' \"$modules\" | grep -qw " +
+        name + "; then\n    cimprovider -d -m " + name +
         " || :  # it may be disabled already\n    cimprovider -r -m " + name + "\nfi\n" +
         deletions(registered);
     return {{{kName, text, isWrittenHere}},
