@@ -52,9 +52,13 @@ mkdir -p "$scratch/firmware"
 cp packaging/adapters.toml "$scratch/adapters.toml"
 cp /usr/lib/ipxe/qemu/efi-virtio.rom /usr/lib/ipxe/qemu/efi-rtl8139.rom "$scratch/firmware/"
 printf 'FWFilePath=%s\n' "$scratch/firmware" >"$scratch/provider.conf"
+# Whom the machine lets install is not for simulated adapters. A policy that others can change would be refused.
+mkdir -p "$scratch/policy"
+printf 'administrators = ["%s", "demo"]\n' "$(id -un)" >"$scratch/policy/policy.toml"
+chmod go-w "$scratch/policy" "$scratch/policy/policy.toml"
 
 quenxctl="$PWD/build/release/bin/quenxctl"
-options=(--adapters "$scratch/adapters.toml" --config "$scratch/provider.conf")
+options=(--adapters "$scratch/adapters.toml" --config "$scratch/provider.conf" --policy "$scratch/policy/policy.toml")
 
 say "The simulated adapters ($scratch/adapters.toml), and the firmware on them"
 show "$quenxctl" "${options[@]}" adapters
@@ -93,6 +97,7 @@ method = "users"
 users_file = "$scratch/users"
 [providers]
 configuration = "$scratch/provider.conf"
+policy = "$scratch/policy/policy.toml"
 [adapters]
 description = "$scratch/adapters.toml"
 state = "$scratch/adapters.state"
