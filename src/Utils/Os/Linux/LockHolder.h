@@ -24,8 +24,8 @@ std::string lockNote();
 /// Who holds the lock (flock) of an open file, for a person: "process 812 (quenxctl)", "process 812
 /// (quenxctl) in another container", "a child that process 812 (quenxctl) left behind" or, where nothing
 /// tells, "another process". The kernel's list is believed first, then the file's note as far as it still
-/// fits: the time of a process's start, where it can be read, tells it from an earlier one of the same number.
-/// A text for people, by which nothing is decided. Takes no rights but those to the file.
+/// fits: the time of a process's start, where it can be read, tells it from an earlier one of the same
+/// number. A text for people, by which nothing is decided. Takes no rights but those to the file.
 std::string describeLockHolder(int file);
 
 }  // namespace os
