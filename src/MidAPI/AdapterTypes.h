@@ -41,6 +41,18 @@ struct ImageVerdict {
     /// What is left to the adapter, which judges the file in the write; each the rest of a sentence that
     /// begins with "It could not be checked".
     std::vector<std::string> unchecked = {};
+    /// The file names the cards that it is for, and this is one of them.
+    bool isForCard = false;
+    /// A version of what the file brings, beside that in the flash.
+    struct Version {
+        std::string name;     ///< as the driver calls it: "fw.mgmt"
+        std::string inFlash;  ///< in force already, or after a reset
+        std::string inFile;
+
+        bool operator==(const Version&) const = default;
+    };
+    /// Versions of all that the file brings; none where the driver or the file does not tell them all.
+    std::vector<Version> versions = {};
 };
 
 /// Error codes that writeFlashImage() and updateCapabilityWord() leave behind. A simulated fault may leave

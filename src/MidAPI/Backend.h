@@ -50,6 +50,7 @@ class QUENX_EXPORT Backend {
                                                    const std::vector<utils::FirmwareType>& types);
     virtual CardUse getCardUse(const std::string& adapter, const std::string& caller);
     virtual Activation activate(const std::string& adapter, const ActivationRequest& request);
+    virtual std::string stateFolder() const;
 };
 
 }  // namespace ma

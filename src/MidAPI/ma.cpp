@@ -53,6 +53,10 @@ std::string Backend::describeSearch() {
     return {};
 }
 
+std::string Backend::stateFolder() const {
+    return {};
+}
+
 std::optional<ImageVerdict> Backend::judgeImage(const std::string&, std::span<const std::uint8_t>,
                                                 const std::vector<utils::FirmwareType>&) {
     return std::nullopt;
@@ -129,6 +133,10 @@ Activation activate(std::string adapter, const ActivationRequest& request) {
 
 void selectBackend(const BackendChoice& choice) {
     selection.exchange(makeBackend(choice));
+}
+
+std::string stateFolder() {
+    return backend()->stateFolder();
 }
 
 std::string describeSearch() {

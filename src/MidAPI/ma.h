@@ -116,6 +116,10 @@ QUENX_EXPORT Activation activate(std::string adapter, const ActivationRequest& r
 /// The simulated adapters keep their flash in QUENX_ADAPTER_STATE, or else in /var/lib/quenx/adapters.
 QUENX_EXPORT void selectBackend(const BackendChoice& choice);
 
+/// The folder in which the adapters keep what they are, where they are files; empty for real ones. Throws
+/// AdapterError where there is no backend.
+QUENX_EXPORT std::string stateFolder();
+
 /// What the backend in use looked for and what it found: sentences for people. Empty when it does not tell.
 QUENX_EXPORT std::string describeSearch();
 

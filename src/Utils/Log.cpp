@@ -4,8 +4,9 @@
 #include <execinfo.h>
 #include <syslog.h>
 
+#include <array>
 #include <cerrno>
-#include <cinttypes>
+#include <charconv>
 #include <cstdarg>
 #include <cstdlib>
 #include <cstring>
@@ -13,6 +14,7 @@
 #include <mutex>
 #include <vector>
 
+#include "Utils/Os/Linux/StackWalk.h"
 #include "Utils/Os/Linux/linux.h"
 #include "Utils/Utils.h"
 
@@ -30,13 +32,6 @@ constexpr int kBacktraceDepth = 40;
 constexpr std::size_t kSkippedFrames = 3;
 
 std::mutex openMutex;
-
-// The first backtrace of a process loads a library. Were that the one of an error in a worker while dlclose
-// waits for the worker, neither would ever end, since dlclose holds the loader's lock.
-const int kBacktraceLoaded = [] {
-    void* frame = nullptr;
-    return backtrace(&frame, 1);
-}();
 
 /// Leaves errno as it was found, and gives it back in between to those who print it.
 class ErrnoKeeper {
@@ -70,20 +65,36 @@ int openOptions() noexcept {
 std::string escapeForSyslog(const std::string& line) {
     std::string format;
     format.reserve(line.size() + 16);
+    std::size_t copied = 0;
     for (std::size_t i = 0; i < line.size(); ++i) {
         const char c = line[i];
-        if (isControl(c)) {
+        if (c != '%' && !isControl(c)) continue;
+        format.append(line, copied, i - copied);
+        copied = i + 1;
+        if (c != '%') {
             format += formatStr("#%03o", static_cast<unsigned int>(c));
-        } else if (c != '%') {
+        } else if (copied < line.size() && (line[copied] == '%' || line[copied] == 'm')) {
             format += c;
-        } else if (i + 1 < line.size() && (line[i + 1] == '%' || line[i + 1] == 'm')) {
-            format += c;
-            format += line[++i];
+            format += line[copied++];
+            ++i;
         } else {
             format += "%%";
         }
     }
-    return format;
+    return format.append(line, copied);
+}
+
+/// "7f0012345678 ", of eight digits at least.
+void appendAddress(std::string& text, const void* address) {
+    constexpr int kHexadecimal = 16;
+    constexpr std::size_t kLeast = 8;
+    std::array<char, 2 * sizeof address> digits{};
+    const char* const end = std::to_chars(digits.data(), digits.data() + digits.size(),
+                                          reinterpret_cast<std::uintptr_t>(address), kHexadecimal)
+                                .ptr;
+    const std::string_view shown(digits.data(), static_cast<std::size_t>(end - digits.data()));
+    if (shown.size() < kLeast) text.append(kLeast - shown.size(), '0');
+    text.append(shown).append(1, ' ');
 }
 
 // A finished line goes to syslog as its format, so that %m works in messages; escapeForSyslog has made it
@@ -201,18 +212,16 @@ __attribute__((noinline)) void logBacktrace(int priority, int depth, bool withSy
     if (depth <= 0) return;
     try {
         std::vector<void*> frames(static_cast<std::size_t>(depth));
-        const int captured = backtrace(frames.data(), depth);
-        frames.resize(static_cast<std::size_t>(captured));
+        frames.resize(os::walkStack(frames));
 
         std::string text = "  Backtrace: ";
-        for (std::size_t i = kSkippedFrames; i < frames.size(); ++i) {
-            text += formatStr("%08" PRIxPTR " ", reinterpret_cast<std::uintptr_t>(frames[i]));
-        }
+        for (std::size_t i = kSkippedFrames; i < frames.size(); ++i)
+            appendAddress(text, frames[i]);
         handOver(priority, text, callersErrno);
 
         if (!withSymbols) return;
-        const std::unique_ptr<char*, decltype(&std::free)> symbols(backtrace_symbols(frames.data(), captured),
-                                                                   &std::free);
+        const std::unique_ptr<char*, decltype(&std::free)> symbols(
+            backtrace_symbols(frames.data(), static_cast<int>(frames.size())), &std::free);
         if (symbols == nullptr) return;
         for (std::size_t i = kSkippedFrames; i < frames.size(); ++i) {
             handOver(priority, formatStr("  %s ", symbols.get()[i]), callersErrno);

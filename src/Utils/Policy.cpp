@@ -32,7 +32,40 @@ void readAdministrators(const TomlTable& table, std::string_view key, const std:
     policy.administratorsPlace = fileName + ", line " + std::to_string(table.line(key));
 }
 
-constexpr Key kKeys[] = {{"administrators", readAdministrators}};
+void readHistory(const TomlTable& table, std::string_view key, const std::string&, Policy& policy) {
+    // In the order of the rules.
+    constexpr std::string_view kNames[] = {"off", "wanted", "required"};
+    if (const auto index = table.choice(key, kNames)) policy.history = static_cast<HistoryRule>(*index);
+}
+
+void readHistoryRecords(const TomlTable& table, std::string_view key, const std::string&, Policy& policy) {
+    constexpr std::int64_t kMost = 10'000'000;
+    const auto records = table.number<std::int64_t>(key, kMost);
+    // Fewer than are shown at once would make the list forget what it has just shown.
+    constexpr std::int64_t kFewest = 1000;
+    if (records && *records < kFewest)
+        table.refuse(key, std::to_string(*records), "at least " + std::to_string(kFewest));
+    policy.historyRecords = records.value_or(policy.historyRecords);
+}
+
+void readHistoryServed(const TomlTable& table, std::string_view key, const std::string&, Policy& policy) {
+    policy.historyServed = table.flag(key, policy.historyServed);
+}
+
+void readReleaseClaim(const TomlTable& table, std::string_view key, const std::string&, Policy& policy) {
+    if (table.has(key)) policy.releaseClaimAfterCheck = table.flag(key, false);
+}
+
+void readKeepImages(const TomlTable& table, std::string_view key, const std::string&, Policy& policy) {
+    const std::optional<std::string> folder = table.text(key);
+    if (folder && !folder->starts_with('/')) table.refuse(key, *folder, "the whole path of a folder");
+    policy.keepImages = folder.value_or("");
+}
+
+constexpr Key kKeys[] = {
+    {"administrators", readAdministrators},          {"history", readHistory},
+    {"history_records", readHistoryRecords},         {"history_served", readHistoryServed},
+    {"release_claim_after_check", readReleaseClaim}, {"keep_images", readKeepImages}};
 
 }  // namespace
 

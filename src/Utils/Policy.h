@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include <cstdint>
 #include <optional>
 #include <stdexcept>
 #include <string>
@@ -20,12 +21,25 @@ class QUENX_EXPORT PolicyError : public std::runtime_error {
     ~PolicyError() override;
 };
 
+/// Whether a history of updates is kept.
+enum class HistoryRule {
+    Off,
+    Wanted,   ///< where it cannot be kept, updates take place all the same
+    Required  ///< where it cannot, none does
+};
+
 /// What the administrators of a machine want kept to, as one reading of their file has it. Whatever is absent
 /// restricts nothing.
 struct Policy {
     /// Who may call methods and delete instances. The list is complete: root has to be in it, too.
     std::optional<std::vector<std::string>> administrators;
     std::string administratorsPlace;  ///< "/etc/quenx/policy.toml, line 3"
+    HistoryRule history = HistoryRule::Wanted;
+    std::int64_t historyRecords = 100'000;  ///< how many are kept
+    bool historyServed = false;             ///< to clients of the model
+    /// Whether a check gives back the adapter that it claimed; absent: as ReleaseClaimAfterCheck has it.
+    std::optional<bool> releaseClaimAfterCheck;
+    std::string keepImages;  ///< a folder for images that were written; empty for none
 };
 
 /// Reads the text of a policy, whole: a key that nothing here obeys would promise what nobody keeps.

@@ -51,6 +51,7 @@ class QUENX_EXPORT TomlTable {
     TomlTable(const toml::table& table, std::string subject)
         : m_table(table), m_subject(std::move(subject)) {}
 
+    bool has(std::string_view key) const { return m_table.contains(key); }
     std::optional<std::string> text(std::string_view key) const;
     std::string requiredText(std::string_view key, std::string_view example) const;
     /// A whole number from 0 to the highest.

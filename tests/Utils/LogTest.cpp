@@ -30,10 +30,10 @@ using Texts = std::vector<std::string>;
 namespace {
 
 /// Logs an error so many calls deeper, and returns the callers of the function that logs, nearest first.
-[[gnu::noinline]] Frames logDeeper(int calls, bool byFormat) {
-    // From two places, so that not every frame looks like the next one.
-    if (calls % 3 == 1) return logDeeper(calls - 1, byFormat);
-    if (calls > 0) return logDeeper(calls - 1, byFormat);
+/// @param first  of the calls in the other place: from two, not every frame looks like the next one
+[[gnu::noinline]] Frames logDeeper(int calls, bool byFormat, int first) {
+    if (calls % 3 == first) return logDeeper(calls - 1, byFormat, first);
+    if (calls > 0) return logDeeper(calls - 1, byFormat, first);
     if (byFormat)
         utils::formatErrorLog("dir/file.cpp", "function", 7, "text");
     else
@@ -113,10 +113,12 @@ TEST(LogTest, ShowsTheCallersOfAnErrorWithSymbolsFromLevelTwo) {
     GTEST_SKIP() << "a sanitizer's own frame is among them";
 #endif
     for (const int level : {1, 2}) {
-        for (const bool byFormat : {false, true}) {
+        // A stack that was seen before, and one of the same size with other callers.
+        for (const auto& [byFormat, first] : {std::pair(false, 1), std::pair(false, 1), std::pair(false, 2),
+                                              std::pair(true, 2), std::pair(true, 1), std::pair(true, 1)}) {
             const LogLevelGuard guard(level);
             SyslogCapture::clear();
-            Frames callers = logDeeper(50, byFormat);
+            Frames callers = logDeeper(50, byFormat, first);
             // 40 frames but the innermost three. With a format these are the log's own, so that the function
             // that logs is shown; else it is one of them.
             callers.resize(byFormat ? 36 : 37);

@@ -126,4 +126,10 @@ std::string_view runningVersion(const std::vector<NamedVersion>& versions, std::
     return found == nullptr ? std::string_view() : found->running;
 }
 
+std::string_view versionInFlash(const std::vector<NamedVersion>& versions, std::string_view name) {
+    const NamedVersion* found = rowOf(versions, &NamedVersion::name, name);
+    if (found == nullptr) return {};
+    return found->stored.empty() ? found->running : found->stored;
+}
+
 }  // namespace ma::devlink

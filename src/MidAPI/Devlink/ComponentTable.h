@@ -65,5 +65,8 @@ class QUENX_EXPORT ComponentTable {
 /// The running version of a name; empty where the driver does not tell it.
 QUENX_EXPORT std::string_view runningVersion(const std::vector<NamedVersion>& versions,
                                              std::string_view name);
+/// The same of the flash: what runs, unless something else waits for a reset.
+QUENX_EXPORT std::string_view versionInFlash(const std::vector<NamedVersion>& versions,
+                                             std::string_view name);
 
 }  // namespace ma::devlink

@@ -108,6 +108,28 @@ void compareVersionsOf(const PackageTarget& target, const PldmPackage& package, 
     }
 }
 
+/// The versions of all that the package brings for the card: that of the whole where the driver tells one,
+/// else those of its components; none where one of them has no counterpart.
+std::vector<ImageVerdict::Version> versionsOf(const PackageTarget& target, const PldmPackage& package,
+                                              const PldmDevice& device) {
+    std::vector<ImageVerdict::Version> found;
+    const auto add = [&](std::string_view name, const std::string& inFile) {
+        const std::string_view inFlash = versionInFlash(target.versions, name);
+        // Texts of two kinds, a maker's name for a release beside a number, differ even where all is the
+        // same.
+        if (inFlash.empty() || !compareVersions(inFile, inFlash)) return false;
+        found.push_back({std::string(name), std::string(inFlash), inFile});
+        return true;
+    };
+    for (const std::string_view name : kSetVersions)
+        if (add(name, device.version)) return found;
+    for (const std::size_t index : device.components) {
+        const PldmComponent& component = package.components[index];
+        if (!add(target.table.versionOf(component.identifier), component.version)) return {};
+    }
+    return found;
+}
+
 /// What the package itself tells.
 PackageVerdict assessPldm(const PackageTarget& target, const PldmPackage& package) {
     if (package.error)
@@ -118,7 +140,9 @@ PackageVerdict assessPldm(const PackageTarget& target, const PldmPackage& packag
     if (device->components.empty())
         return refuse(PrepareStatus::ImageNotApplicable, "the package has no image for this card");
     PackageVerdict verdict;
-    if (!device->namesPciDevice()) verdict.unchecked.emplace_back(kWhichCard);
+    verdict.isForCard = device->namesPciDevice();
+    if (!verdict.isForCard) verdict.unchecked.emplace_back(kWhichCard);
+    verdict.versions = versionsOf(target, package, *device);
     compareVersionsOf(target, package, *device, verdict);
     return verdict;
 }

@@ -28,7 +28,8 @@ Simulator::Simulator(const std::string& descriptionFile, const std::string& stat
 }
 
 Simulator::Simulator(std::vector<AdapterDescription> adapters, const std::string& stateDirectory,
-                     std::shared_ptr<FlashFiles> files) {
+                     std::shared_ptr<FlashFiles> files)
+    : m_stateDirectory(stateDirectory) {
     for (AdapterDescription& adapter : adapters)
         m_adapters.push_back(std::make_unique<SimulatedAdapter>(std::move(adapter), stateDirectory, files));
 }

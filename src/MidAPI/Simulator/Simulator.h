@@ -51,13 +51,15 @@ class QUENX_EXPORT Simulator : public Backend {
     AdapterInfo getAdapterInfo(const std::string& adapter) override;
     std::string name() const override { return kSimulatorBackend; }
     std::string describeSearch() override;
+    std::string stateFolder() const override { return m_stateDirectory; }
 
   private:
     SimulatedAdapter* find(const std::string& name) const;
     SimulatedAdapter& require(const std::string& name) const;
 
     std::vector<std::unique_ptr<SimulatedAdapter>> m_adapters;  // not changed after construction
-    std::string m_descriptionFile;                              // nor this; empty when there was none
+    const std::string m_stateDirectory;
+    std::string m_descriptionFile;  // nor this; empty when there was none
 };
 
 }  // namespace ma

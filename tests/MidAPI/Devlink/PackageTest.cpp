@@ -121,7 +121,10 @@ std::string answerTo(const Bytes& file, const std::vector<FirmwareType>& types,
     for (const FirmwareType type : verdict.types)
         answer += std::string(ma::firmwareTypeName(type)) + ' ';
     const std::string unchecked = utils::joined(verdict.unchecked, "; ");
-    return answer + utils::joined(verdict.components) + (unchecked.empty() ? ":" : ": ") + unchecked;
+    answer += utils::joined(verdict.components) + (unchecked.empty() ? ":" : ": ") + unchecked;
+    for (const auto& [name, inFlash, inFile] : verdict.versions)
+        answer += ' ' + name + ' ' + inFlash + " -> " + inFile;
+    return answer + (verdict.isForCard ? " (for it)" : "");
 }
 
 TEST(PackageVerdictTest, FollowsFromIdsVersionsAndTypes) {
@@ -134,8 +137,9 @@ TEST(PackageVerdictTest, FollowsFromIdsVersionsAndTypes) {
     EXPECT_EQ("2 this adapter cannot be updated: it has gone:", answerTo(Bytes(100), {}, "it has gone"));
     ComponentTable components;
     components.set(ComponentTable::PackageRow{256, "fw.mgmt"});
-    EXPECT_EQ("3 fw.mgmt would go back from version 3.1 (installed) to 3.0 (in the file):",
-              answerTo(package("image 256"), {}, "", components));
+    EXPECT_EQ(
+        "3 fw.mgmt would go back from version 3.1 (installed) to 3.0 (in the file): fw 1.9 -> 2.0 (for it)",
+        answerTo(package("image 256"), {}, "", components));
 }
 
 TEST(DevlinkSettingsTest, AreReadWhole) {

@@ -138,6 +138,16 @@ void SMASHv2Config::setDefaultImageReadTimeout(std::chrono::seconds silence) {
     m_own.imageLimits.silence = silence;
 }
 
+void SMASHv2Config::setUploadDirectory(std::string path) {
+    const Mutex::AutoLocker locker(m_ownMutex);
+    m_uploadDirectory = std::move(path);
+}
+
+std::string SMASHv2Config::getUploadDirectory() {
+    const Mutex::AutoLocker locker(m_ownMutex);
+    return m_uploadDirectory;
+}
+
 void SMASHv2Config::initialize() {
     Mutex::AutoLocker locker(m_mutex);
     try {

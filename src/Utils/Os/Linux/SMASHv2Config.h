@@ -64,6 +64,11 @@ class QUENX_EXPORT SMASHv2Config : public AutoSingleton<SMASHv2Config> {
     /// Gives ImageReadTimeout another value for as long as the file has none, instead of 30 seconds.
     void setDefaultImageReadTimeout(std::chrono::seconds silence);
 
+    /// Where a front puts images that its clients send, one folder for each; empty for nowhere. The inventory
+    /// looks there, too. No key sets it: the front does.
+    void setUploadDirectory(std::string path);
+    std::string getUploadDirectory();
+
     static const char* GetSingletonName() { return "SMASHv2Config"; }
     static std::unique_ptr<SMASHv2Config> CreateSingleton();
 
@@ -89,6 +94,7 @@ class QUENX_EXPORT SMASHv2Config : public AutoSingleton<SMASHv2Config> {
     StringArray m_firmwarePaths QUENX_GUARDED_BY(m_mutex);
     Mutex m_ownMutex;
     OwnSettings m_own QUENX_GUARDED_BY(m_ownMutex);
+    std::string m_uploadDirectory QUENX_GUARDED_BY(m_ownMutex);
 };
 
 extern template class Singleton<SMASHv2Config>;

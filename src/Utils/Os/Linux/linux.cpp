@@ -114,7 +114,9 @@ std::size_t readFile(const std::string& path, std::span<std::uint8_t> buffer) no
 }
 
 std::optional<std::vector<std::uint8_t>> readWholeFile(const std::string& path, std::size_t most) {
-    constexpr std::size_t kStep = std::size_t{256} * 1024;
+    // The room of each step is cleared first, and most files are a line of /sys: so it begins small.
+    std::size_t step = 4096;
+    constexpr std::size_t kLargestStep = std::size_t{256} * 1024;
     const Descriptor file(openForReading(path));
     if (!file.isOpen() && errno == ENOENT) return std::nullopt;
     std::vector<std::uint8_t> bytes;
@@ -122,7 +124,8 @@ std::optional<std::vector<std::uint8_t>> readWholeFile(const std::string& path, 
     // Read in steps, not by the size that the system tells: files in /proc have none, and a file may grow.
     for (bool more = true; more && error == 0 && bytes.size() < most;) {
         const std::size_t length = bytes.size();
-        bytes.resize(std::min(most, length + kStep));
+        bytes.resize(std::min(most, length + step));
+        step = std::min(step * 4, kLargestStep);
         std::size_t count = 0;
         error = readUpTo(file, std::span(bytes).subspan(length), count);
         more = length + count == bytes.size();
