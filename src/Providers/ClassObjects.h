@@ -3,8 +3,12 @@
 // and how instances come by those of other classes.
 #pragma once
 
+#include <algorithm>
+#include <cstdint>
 #include <memory>
 #include <string>
+#include <typeinfo>
+#include <utility>
 #include <vector>
 
 #include "Framework/Classes/CimBroker.h"
@@ -29,6 +33,32 @@ void setOrNull(Property& property, bool isKnown, const Value& value) {
     }
 }
 
+/// dynamic_cast for many objects: where the T is in one of them, it is in the others of its type.
+template <class T>
+class ManyCasts {
+  public:
+    /// Null for one that is no T.
+    T* operator()(core::CimInstance* object) {
+        const std::type_info& type = typeid(*object);
+        if (m_type != &type) {
+            T* const found = dynamic_cast<T*>(object);
+            m_type = &type;
+            m_isFound = found != nullptr;
+            m_distance = m_isFound ? reinterpret_cast<std::intptr_t>(found) - placeOf(object) : 0;
+        }
+        return m_isFound ? reinterpret_cast<T*>(placeOf(object) + m_distance) : nullptr;
+    }
+
+  private:
+    static std::intptr_t placeOf(core::CimInstance* object) {
+        return reinterpret_cast<std::intptr_t>(object);
+    }
+
+    const std::type_info* m_type = nullptr;
+    bool m_isFound = false;
+    std::intptr_t m_distance = 0;
+};
+
 /// The instances of a class as the broker finds them, those that are a T. Holds them while it lives.
 template <class T>
 class InstancesOf {
@@ -36,8 +66,9 @@ class InstancesOf {
     /// @param provider  whose instances; empty for those of everybody who serves the class
     explicit InstancesOf(const std::string& className, const std::string& provider = {})
         : m_all(core::GetCimBroker()->getInstances(className, provider)) {
+        ManyCasts<T> cast;
         for (core::CimInstance* each : m_all)
-            if (auto* found = dynamic_cast<T*>(each)) m_found.push_back(found);
+            if (T* found = cast(each)) m_found.push_back(found);
     }
 
     /// How many instances the class has, including those that are not a T.
@@ -136,30 +167,57 @@ class Rebuild {
     bool m_isPublished = false;
 };
 
-/// A class object with one instance for each key. The instances are kept, and only refreshed, while the keys
-/// stay the same, so that references to them stay good. T is built from a Key and has refresh().
+/// Keys in parts. A part never changes, so one that is kept is known again by its place, not key by key.
+template <class Key>
+using KeyParts = std::vector<std::shared_ptr<const std::vector<Key>>>;
+
+/// A class object with one instance for each key. The instances are kept while the keys stay the same, so
+/// that references to them stay good. T is built from a Key and has refresh(), which is called at each look;
+/// one whose values all follow from its key has a member kFollowsFromKey, and is refreshed when it is made.
 template <class T, class Key>
 class CachedClass : public ListedClass<T> {
   protected:
     /// The instances for these keys, all of them fresh.
-    core::InstanceList::Iterator serve(const std::vector<Key>& keys) {
+    core::InstanceList::Iterator serve(const KeyParts<Key>& keys) {
         if (!rebuild(keys)) {
             for (core::CimInstance* instance : core::InstanceRange(this->m_instances.getElements(false)))
                 static_cast<T*>(instance)->refresh();
         }
         return this->m_instances.getElements(false);
     }
+    core::InstanceList::Iterator serve(std::vector<Key> keys) { return serve(onePart(std::move(keys))); }
+
+    /// The one that the path names, fresh; null when none of these keys is its.
+    T* find(const KeyParts<Key>& keys, const core::CimPath& path) {
+        const bool isFresh = rebuild(keys);
+        auto* found = static_cast<T*>(this->m_instances.find(path));
+        if (found != nullptr && !isFresh) found->refresh();
+        return found;
+    }
+    T* find(std::vector<Key> keys, const core::CimPath& path) { return find(onePart(std::move(keys)), path); }
 
   private:
-    /// False when the keys are those of the last time.
-    bool rebuild(const std::vector<Key>& keys) {
+    static KeyParts<Key> onePart(std::vector<Key> keys) {
+        return {std::make_shared<const std::vector<Key>>(std::move(keys))};
+    }
+    static bool isSame(const KeyParts<Key>& left, const KeyParts<Key>& right) {
+        return std::ranges::equal(
+            left, right, [](const auto& one, const auto& other) { return one == other || *one == *other; });
+    }
+
+    /// Whether the instances are fresh then: made now, or such as never change.
+    bool rebuild(const KeyParts<Key>& keys) {
         const utils::Mutex::AutoLocker lock(m_mutex);
-        if (keys == m_keys) return false;
+        if (isSame(keys, m_keys)) return requires {
+                T::kFollowsFromKey;
+            };
         core::InstanceList rebuilt;
-        for (const Key& key : keys) {
-            auto instance = std::make_unique<T>(key);
-            instance->refresh();
-            rebuilt.add(instance.release());
+        for (const auto& part : keys) {
+            for (const Key& key : *part) {
+                auto instance = std::make_unique<T>(key);
+                instance->refresh();
+                rebuilt.add(instance.release());
+            }
         }
         m_keys = keys;
         this->m_instances.publish(rebuilt);
@@ -167,5 +225,5 @@ class CachedClass : public ListedClass<T> {
     }
 
     utils::Mutex m_mutex;
-    std::vector<Key> m_keys QUENX_GUARDED_BY(m_mutex);
+    KeyParts<Key> m_keys QUENX_GUARDED_BY(m_mutex);
 };

@@ -64,6 +64,24 @@ TEST_F(InstanceListTest, OwnsWhatIsAddedThroughItsBase) {
     EXPECT_EQ(ids(list.getElements(false)), std::vector<std::string>());
 }
 
+TEST_F(InstanceListTest, FindsByTheKeysOfTheMoment) {
+    core::InstanceList list;
+    for (unsigned int i = 0; i < 100; ++i)
+        list.add(new Gadget("many", i));
+    auto* gadget = new Gadget("a", 1);
+    list.add(gadget);
+    const auto find = [&](const char* path) { return list.find(core::CimPath(std::string(path))); };
+    EXPECT_EQ(find("TEST_gadget.number=1,id=\"a\""), gadget);
+    for (const char* other : {"Test_Gadget.ID=\"A\",Number=1", "Test_Link.ID=\"a\",Number=1", "!"})
+        EXPECT_EQ(find(other), nullptr) << other;
+    gadget->ID = "b";
+    EXPECT_EQ(find("Test_Gadget.ID=\"a\",Number=1"), nullptr);
+    EXPECT_EQ(find("Test_Gadget.ID=\"b\",Number=1"), gadget);
+    gadget->setDeleted(true);
+    EXPECT_EQ(Gadget::living, 100) << "the index keeps nothing";
+    EXPECT_EQ(find("Test_Gadget.ID=\"b\",Number=1"), nullptr);
+}
+
 struct Slow : Gadget {
     Slow() : Gadget("slow") { setDestructionWaits(); }
 };

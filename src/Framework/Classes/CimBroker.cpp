@@ -102,6 +102,11 @@ std::vector<AgentUse> CimBroker::useAgents() {
 CimInstance* CimBroker::getInstanceByPath(CimPath& path) {
     if (!path.isValid() || !RequestScope::serves(path.getNamespace())) return nullptr;
     for (const AgentUse& use : useAgents()) {
+        const ServedClass* served = use.agent().getClasses().find(path.getClassName());
+        if (served != nullptr && served->findInstance != nullptr) {
+            if (CimInstance* found = served->findInstance(*served->object, path)) return found;
+            continue;
+        }
         if (!use.agent().isClassSupported(path.getClassName())) continue;
         for (CimInstance* instance : InstanceRange(use.agent().getInstances(path.getClassName()))) {
             if (path.isSameObjectAs(*instance)) return instance;

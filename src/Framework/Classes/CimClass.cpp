@@ -61,8 +61,9 @@ void CimClasses::append(ServedClass served) {
 }
 
 const ServedClass* CimClasses::find(std::string_view className) const {
-    for (const ServedClass* served : getAll()) {
-        if (sameName(served->name, className)) return served;
+    const utils::Mutex::AutoLocker lock(m_mutex);
+    for (const auto& served : m_served) {
+        if (sameName(served->name, className)) return served.get();
     }
     return nullptr;
 }

@@ -40,6 +40,14 @@ concept DeletesInstances = requires(T& object, CimPath& path) {
     { object.DeleteInstance(path) } -> std::convertible_to<int>;
 };
 
+/// A class object that finds an instance by its path without refreshing the others; null when the path names
+/// none. What it finds is as fresh as an enumeration would serve it, stays owned by its list, and is held by
+/// the calling thread's request scope. Found like DeletesInstances.
+template <class T>
+concept FindsInstances = requires(T& object, const CimPath& path) {
+    { object.findInstance(path) } -> std::convertible_to<CimInstance*>;
+};
+
 /// A class object that says which instance class it serves, and so what its declaration is.
 template <class T>
 concept DeclaresInstances = requires {
@@ -49,10 +57,12 @@ concept DeclaresInstances = requires {
 /// A class object with what is known of its type.
 struct ServedClass {
     using Delete = int (*)(CimClass& object, CimPath& path);
+    using Find = CimInstance* (*)(CimClass& object, const CimPath& path);
 
     std::unique_ptr<CimClass> object;
     const CimClassInfo* info = nullptr;  ///< null when the class object declares nothing
     Delete deleteInstance = nullptr;     ///< null when its instances cannot be deleted
+    Find findInstance = nullptr;         ///< null when they are found among all of them only
     std::string name;                    ///< what getClassName() says
     ClassChain chain;                    ///< never empty; without class information it holds the bare name
     std::vector<ClassChain> mentioned = {};  ///< of the classes that its parameters name and nobody serves
@@ -70,11 +80,16 @@ class QUENX_EXPORT CimClasses {
     /// Takes ownership, also when it throws.
     template <std::derived_from<CimClass> T>
     void add(T* object) {
-        ServedClass served{std::unique_ptr<CimClass>(object), nullptr, nullptr, {}, {}};
+        ServedClass served{std::unique_ptr<CimClass>(object), nullptr, nullptr, nullptr, {}, {}};
         if constexpr (DeclaresInstances<T>) served.info = &T::Instance::classInfo;
         if constexpr (DeletesInstances<T>) {
             served.deleteInstance = [](CimClass& base, CimPath& path) -> int {
                 return static_cast<T&>(base).DeleteInstance(path);
+            };
+        }
+        if constexpr (FindsInstances<T>) {
+            served.findInstance = [](CimClass& base, const CimPath& path) -> CimInstance* {
+                return static_cast<T&>(base).findInstance(path);
             };
         }
         append(std::move(served));

@@ -4,10 +4,12 @@
 #include <pthread.h>
 
 #include <algorithm>
+#include <atomic>
 #include <condition_variable>
 #include <cstdint>
 #include <mutex>
 
+#include "Framework/Classes/KeyIndex.h"
 #include "Framework/Classes/RequestScope.h"
 #include "Framework/Model/CimInstance.h"
 #include "Utils/Os/Linux/SignalsBlocked.h"
@@ -220,6 +222,9 @@ class InstanceList::Link : public InstanceListLink {
         const utils::Mutex::AutoLocker lock(m_mutex);
         if (m_list != nullptr) m_list->remove(instance);
     }
+    // Counted only: it is called under the instance's lock, where no other may be taken.
+    void keyChanged() noexcept override { m_keyChanges.fetch_add(1, std::memory_order_acq_rel); }
+    std::uint32_t keyChanges() const noexcept { return m_keyChanges.load(std::memory_order_acquire); }
     /// The list is about to go.
     void close() {
         const utils::Mutex::AutoLocker lock(m_mutex);
@@ -229,6 +234,7 @@ class InstanceList::Link : public InstanceListLink {
   private:
     utils::Mutex m_mutex;
     InstanceList* m_list QUENX_GUARDED_BY(m_mutex);
+    std::atomic<std::uint32_t> m_keyChanges{0};
 };
 
 InstanceList::InstanceList() : m_link(std::make_shared<Link>(this)) {
@@ -254,9 +260,35 @@ InstanceList::Iterator InstanceList::getElements(bool) {
 
 InstanceList::SharedSnapshot InstanceList::snapshot() {
     const utils::Mutex::AutoLocker lock(getMutex());
-    // Kept until the list changes: most lists are read far more often than they change.
-    if (m_cached == nullptr) m_cached = std::make_shared<const Snapshot>(m_held);
-    return m_cached;
+    if (m_cache.snapshot == nullptr) m_cache.snapshot = std::make_shared<const Snapshot>(m_held);
+    return m_cache.snapshot;
+}
+
+InstanceList::Cache InstanceList::indexed() {
+    // Asked first: a key that changes while the index is made makes it old at once.
+    const std::uint32_t keyChanges = m_link->keyChanges();
+    const SharedSnapshot current = snapshot();
+    {
+        const utils::Mutex::AutoLocker lock(getMutex());
+        const bool isCurrent = m_cache.snapshot == current && m_cache.index != nullptr;
+        if (isCurrent && m_cache.index->keyChanges() == keyChanges) return m_cache;
+    }
+    // Outside the lock, since it takes those of the instances.
+    auto index = std::make_shared<const KeyIndex>(*current, keyChanges);
+    const utils::Mutex::AutoLocker lock(getMutex());
+    if (m_cache.snapshot == current) m_cache.index = index;
+    return {current, std::move(index)};
+}
+
+CimInstance* InstanceList::find(const CimPath& path) {
+    const Cache cache = indexed();
+    for (const KeyIndex::Place& place : cache.index->placesOf(path)) {
+        const std::shared_ptr<CimInstance>& found = (*cache.snapshot)[place.position];
+        if (found->isDeleted() || !path.isSameObjectAs(*found)) continue;
+        holdInScope(found);
+        return found.get();
+    }
+    return nullptr;
 }
 
 void InstanceList::add(CimInstance* element) {
@@ -264,7 +296,7 @@ void InstanceList::add(CimInstance* element) {
     const std::shared_ptr<CimInstance> owned(element, &InstanceReaper::release);
     element->m_list = m_link;
     holdInScope(owned);
-    SharedSnapshot outdated;
+    Cache outdated;
     const utils::Mutex::AutoLocker lock(getMutex());
     m_held.push_back(owned);
     // The base's list has to name the same elements, whatever happens: callers may walk it.
@@ -274,28 +306,28 @@ void InstanceList::add(CimInstance* element) {
         m_held.pop_back();
         throw;
     }
-    outdated.swap(m_cached);
+    std::swap(outdated, m_cache);
 }
 
 void InstanceList::clear() {
     // What is let go of is destroyed after the lock is released.
     Snapshot released;
-    SharedSnapshot outdated;
+    Cache outdated;
     const utils::Mutex::AutoLocker lock(getMutex());
     released.swap(m_held);
-    outdated.swap(m_cached);
+    std::swap(outdated, m_cache);
     getStlList().clear();
 }
 
 bool InstanceList::remove(const CimInstance* element) {
     std::shared_ptr<CimInstance> released;
-    SharedSnapshot outdated;
+    Cache outdated;
     const utils::Mutex::AutoLocker lock(getMutex());
     const auto found = std::ranges::find_if(m_held, [&](const auto& each) { return each.get() == element; });
     if (found == m_held.end()) return false;
     released = std::move(*found);
     m_held.erase(found);
-    outdated.swap(m_cached);
+    std::swap(outdated, m_cache);
     getStlList().remove(const_cast<CimInstance*>(element));
     return true;
 }
@@ -303,12 +335,12 @@ bool InstanceList::remove(const CimInstance* element) {
 void InstanceList::publish(InstanceList& rebuilt) {
     Snapshot taken;
     std::list<CimInstance*> elements;
-    SharedSnapshot outdated;
+    Cache outdated;
     {
         const utils::Mutex::AutoLocker lock(rebuilt.getMutex());
         taken.swap(rebuilt.m_held);
         elements.swap(rebuilt.getStlList());
-        rebuilt.m_cached.reset();
+        rebuilt.m_cache = {};
     }
     // Before they are listed: from then on any thread may delete one.
     for (const auto& instance : taken)
@@ -316,7 +348,7 @@ void InstanceList::publish(InstanceList& rebuilt) {
     const utils::Mutex::AutoLocker lock(getMutex());
     m_held.swap(taken);
     getStlList().swap(elements);
-    outdated.swap(m_cached);
+    std::swap(outdated, m_cache);
 }
 
 InstanceList::Iterator joinInstances(std::vector<InstanceList::Iterator> parts) {

@@ -11,6 +11,8 @@
 namespace core {
 
 class CimInstance;
+class CimPath;
+class KeyIndex;
 
 /// A class object's instances. Owns them: an element is destroyed when the list and every snapshot, iterator
 /// and request that holds it have let go. Thread-safe.
@@ -34,6 +36,10 @@ class QUENX_EXPORT InstanceList : public utils::SafeList<CimInstance*>,
     void clear() override;
     /// Lets go of one element; false when it is not listed.
     bool remove(const CimInstance* element);
+    /// The listed instance that the path names, by an index of the keys; null when there is none. The calling
+    /// thread's request scope holds it. A path with a reference among its keys finds nothing where the class
+    /// declares a text, nor the other way round.
+    CimInstance* find(const CimPath& path);
     /// Takes over the other list's elements and lets go of its own, in one step: nobody sees half a list.
     /// The other list is left empty.
     void publish(InstanceList& rebuilt);
@@ -42,11 +48,19 @@ class QUENX_EXPORT InstanceList : public utils::SafeList<CimInstance*>,
     using SharedSnapshot = std::shared_ptr<const Snapshot>;
     class Link;
 
+    /// What is made of the list when it is read, and kept until it changes: most lists are read far more
+    /// often than they change. The index, which only look-ups need, ends with a change of any key, too.
+    struct Cache {
+        SharedSnapshot snapshot;
+        std::shared_ptr<const KeyIndex> index;
+    };
+
     SharedSnapshot snapshot();
+    Cache indexed();
 
     std::shared_ptr<Link> m_link;
     Snapshot m_held QUENX_GUARDED_BY(getMutex());
-    SharedSnapshot m_cached QUENX_GUARDED_BY(getMutex());
+    Cache m_cache QUENX_GUARDED_BY(getMutex());
 };
 
 /// Several enumerations as one, in their order; none of them gives an empty one. It keeps the elements of

@@ -3,6 +3,7 @@
 
 #include <algorithm>
 #include <iterator>
+#include <numeric>
 #include <set>
 #include <unordered_map>
 
@@ -24,8 +25,8 @@ thread_local DeclarationRecorder* currentRecorder = nullptr;
 /// last one, since that is the most derived.
 struct CimInstance::Shape {
     explicit Shape(const std::vector<CimProperty*>& properties) {
-        for (const CimProperty* property : properties)
-            signature.emplace_back(property->getName(), property->isKey());
+        for (CimProperty* property : properties)
+            signature.emplace_back(property);
         std::set<std::string> seen;
         for (std::size_t i = properties.size(); i-- > 0;) {
             if (seen.insert(foldName(properties[i]->getName())).second) served.push_back(i);
@@ -36,15 +37,33 @@ struct CimInstance::Shape {
     }
 
     bool isOf(const std::vector<CimProperty*>& properties) const {
-        return std::ranges::equal(signature, properties, [](const auto& known, const CimProperty* property) {
-            return known.second == property->isKey() && known.first == property->getName();
+        return std::ranges::equal(signature, properties, [](const Signature& known, CimProperty* property) {
+            return known.isOf(*property);
         });
     }
+
+    struct Signature {
+        explicit Signature(CimProperty* property)
+            : name(property->getName()),
+              type(property->getType()),
+              isArray(property->isArray()),
+              isKey(property->isKey()) {}
+
+        bool isOf(CimProperty& property) const {
+            return isKey == property.isKey() && type == property.getType() && isArray == property.isArray() &&
+                   name == property.getName();
+        }
+
+        std::string name;
+        CimType type;
+        bool isArray;
+        bool isKey;
+    };
 
     /// What a shape depends on. Neither the class nor its name would do: two classes may add properties of
     /// their own to one binding. Addresses would not do either, which another library may reuse after an
     /// unload.
-    std::vector<std::pair<std::string, bool>> signature;
+    std::vector<Signature> signature;
     std::vector<std::size_t> served;
     std::vector<std::size_t> keys;  ///< those of the served ones that are keys
 };
@@ -149,6 +168,7 @@ std::shared_ptr<const CimPath> CimInstance::getPath() const {
 void CimInstance::forgetPath() const {
     const RecursiveLocker lock(m_mutex);
     m_path.reset();
+    if (const auto list = m_list.lock()) list->keyChanged();
 }
 
 std::vector<CimProperty*> CimInstance::getKeys() const {
@@ -194,6 +214,24 @@ CimPath CimPath::of(const CimInstance& instance) {
             {property->getName(), value.scalar() ? *value.scalar() : CimScalar(std::string())});
     }
     return path;
+}
+
+namespace {
+
+/// Of the value that CimPath::of() gives the key.
+std::size_t hashOfKey(const CimProperty& key) {
+    if (key.isNull() || key.isArray()) return hashOf(CimCell(std::string_view()));
+    return key.cellCount() != 0 ? hashOf(key.cell(0)) : hashOf(*key.getValue().scalar());
+}
+
+}  // namespace
+
+std::size_t CimInstance::hashOfKeys() const {
+    const RecursiveLocker lock(m_mutex);
+    const std::vector<std::size_t>& keys = shape().keys;
+    return std::accumulate(
+        keys.begin(), keys.end(), std::size_t{0},
+        [this](std::size_t sum, std::size_t key) { return sum + hashOfKey(*m_properties[key]); });
 }
 
 bool CimPath::isSameObjectAs(const CimInstance& instance) const {

@@ -50,6 +50,8 @@ class InstanceListLink {
     virtual ~InstanceListLink() = default;
     /// Takes the instance out of its list, if the list still exists.
     virtual void remove(const CimInstance* instance) = 0;
+    /// An instance of the list has another key than before. Called under the instance's lock.
+    virtual void keyChanged() noexcept = 0;
 };
 
 /// Base of every instance class.
@@ -59,6 +61,11 @@ class InstanceListLink {
 /// most derived.
 class QUENX_EXPORT CimInstance {
   public:
+    /// What instances have in common whose properties have the same names, types and keys in the same order:
+    /// whatever was found out of one by that is true of all. One object for them all, which lives as long as
+    /// the process.
+    struct Shape;
+
     /// A provider method: input arguments, output arguments, an instance handed back (such as a created job);
     /// returns the method's CIM return value. The instance handed back stays owned by its class object's
     /// list.
@@ -96,12 +103,17 @@ class QUENX_EXPORT CimInstance {
     std::vector<CimProperty*> getKeys() const;
     /// Every registered property, repeated names included, in the order of construction.
     const std::vector<CimProperty*>& getAllProperties() const { return m_properties; }
+    /// To be called under the lock below.
+    const Shape& shape() const QUENX_REQUIRES(m_mutex);
     /// CimPath::of() this instance, found once and shared until a key changes.
     std::shared_ptr<const CimPath> getPath() const;
 
+    /// The same for instances whose paths are the same; of few others.
+    std::size_t hashOfKeys() const;
+
     /// Guards the values of all properties. A refresh holds it from beginning to end, a front while it copies
     /// the values, so that nobody sees half a refresh. Never hold the locks of two instances.
-    RecursiveMutex& getMutex() const { return m_mutex; }
+    RecursiveMutex& getMutex() const QUENX_RETURN_CAPABILITY(m_mutex) { return m_mutex; }
 
   protected:
     /// Registers a method under its CIM name; called in constructors. The member may be virtual.
@@ -123,13 +135,11 @@ class QUENX_EXPORT CimInstance {
     std::uint64_t releaseTime() const { return m_releaseTime; }
 
   private:
-    struct Shape;
     friend class CimProperty;
     friend class InstanceList;
     friend class InstanceReaper;
 
     static std::shared_ptr<const Shape> findShape(const std::vector<CimProperty*>& properties);
-    const Shape& shape() const QUENX_REQUIRES(m_mutex);
     std::vector<CimProperty*> select(const std::vector<std::size_t>& indices) const;
     void registerProperty(CimProperty* property);
     void unregisterProperty(CimProperty* property) noexcept;

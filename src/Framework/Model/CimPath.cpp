@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 // Object paths: their text form, and when two name the same object.
 #include <algorithm>
+#include <numeric>
 #include <set>
 
 #include "Framework/Model/CimValue.h"
@@ -156,6 +157,12 @@ void CimValue::completeNamespace(std::string_view name) {
     forEach([&](CimScalar& scalar) {
         if (auto* path = std::get_if<CimPath>(&scalar)) path->completeNamespace(name);
     });
+}
+
+std::size_t CimPath::hashOfKeys() const {
+    // A sum, since keys come in any order.
+    return std::accumulate(m_keys.begin(), m_keys.end(), std::size_t{0},
+                           [](std::size_t sum, const CimKey& key) { return sum + hashOf(key.value); });
 }
 
 bool CimPath::isSameObjectAs(const CimPath& other) const {

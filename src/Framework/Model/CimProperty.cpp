@@ -7,7 +7,6 @@
 
 #include "Framework/Model/CimError.h"
 #include "Framework/Model/CimInstance.h"
-#include "Framework/Model/CimValue.h"
 
 namespace core {
 
@@ -54,8 +53,12 @@ using Held = std::conditional_t<!std::is_integral_v<T> || std::is_same_v<T, bool
                                 std::conditional_t<std::is_signed_v<T>, std::int64_t, std::uint64_t>>;
 
 template <class T>
-CimScalar hold(const T& value) {
-    return static_cast<Held<T>>(value);
+CimCell seen(const T& value) {
+    if constexpr (std::is_same_v<T, std::string>) {
+        return std::string_view(value);
+    } else {
+        return static_cast<Held<T>>(value);
+    }
 }
 
 template <class T>
@@ -144,6 +147,22 @@ CimValue CimProperty::getValue() const {
     return value;
 }
 
+CimCell CimProperty::cell(std::size_t) const {
+    return {};
+}
+
+void CimProperty::load(CimValue& value) const {
+    if (!m_array) {
+        value.data = scalarOf(cell(0));
+        return;
+    }
+    std::vector<CimScalar> elements;
+    elements.reserve(cellCount());
+    for (std::size_t i = 0; i < cellCount(); ++i)
+        elements.push_back(scalarOf(cell(i)));
+    value.data = std::move(elements);
+}
+
 void CimProperty::setValue(const CimValue& value) {
     // Converted before the lock: a reader waits for the swap alone.
     const CimValue held = converted(*this, m_type, value);
@@ -176,8 +195,8 @@ T CimPropertyScalar<T, Type>::get() const {
 }
 
 template <class T, CimType Type>
-void CimPropertyScalar<T, Type>::load(CimValue& value) const {
-    value.data = hold(m_value);
+CimCell CimPropertyScalar<T, Type>::cell(std::size_t) const {
+    return seen(m_value);
 }
 
 template <class T, CimType Type>
@@ -217,10 +236,8 @@ std::vector<T> CimPropertyArray<T, Type>::get() const {
 }
 
 template <class T, CimType Type>
-void CimPropertyArray<T, Type>::load(CimValue& value) const {
-    std::vector<CimScalar> elements(m_values.size());
-    std::transform(m_values.begin(), m_values.end(), elements.begin(), hold<T>);
-    value.data = std::move(elements);
+CimCell CimPropertyArray<T, Type>::cell(std::size_t index) const {
+    return seen(m_values[index]);
 }
 
 template <class T, CimType Type>

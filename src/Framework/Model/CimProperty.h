@@ -9,16 +9,14 @@
 #include <string>
 #include <vector>
 
-#include "Framework/Model/CimType.h"
+#include "Framework/Model/CimValue.h"
 #include "Utils/Export.h"
 #include "Utils/Time.h"
 
 namespace core {
 
 class CimInstance;
-class CimPath;
 class RecursiveMutex;
-struct CimValue;
 
 /// One property of an instance, or one argument of a method call.
 ///
@@ -73,9 +71,16 @@ class QUENX_EXPORT CimProperty {
 
     void addListener(Listener* listener);
 
+    // For a reader that holds the owner's lock, and does not want a copy.
+    bool isNull() const { return m_null; }
+    /// How many single values it holds, and one of them, good while the lock is held. A reference has none
+    /// that can be seen so; neither may be asked for of a null property.
+    virtual std::size_t cellCount() const { return 0; }
+    virtual CimCell cell(std::size_t index) const;
+
   protected:
     /// Both are called under the owner's lock, and only for a value that is not null.
-    virtual void load(CimValue& value) const = 0;
+    virtual void load(CimValue& value) const;
     virtual void store(const CimValue& value) = 0;
 
     void setReferenceClass(const char* name) { m_referenceClass = name; }
@@ -83,8 +88,7 @@ class QUENX_EXPORT CimProperty {
     /// Takes the owner's lock, where there is an owner.
     std::unique_lock<RecursiveMutex> lockOwner() const;
 
-    /// Both under the owner's lock. To be called after each change of the value.
-    bool isNull() const { return m_null; }
+    /// Under the owner's lock. To be called after each change of the value.
     void changed(bool isNull = false);
 
   private:
@@ -110,8 +114,10 @@ class CimPropertyScalar : public CimProperty {
     /// T() when null, an interval of 0 for a datetime.
     T get() const;
 
+    std::size_t cellCount() const override { return 1; }
+    CimCell cell(std::size_t index) const override;
+
   protected:
-    void load(CimValue& value) const override;
     void store(const CimValue& value) override;
 
     T m_value;
@@ -130,8 +136,10 @@ class CimPropertyArray : public CimProperty {
     /// Empty when null.
     std::vector<T> get() const;
 
+    std::size_t cellCount() const override { return m_values.size(); }
+    CimCell cell(std::size_t index) const override;
+
   protected:
-    void load(CimValue& value) const override;
     void store(const CimValue& value) override;
 
   private:

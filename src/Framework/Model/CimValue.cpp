@@ -5,6 +5,7 @@
 #include <charconv>
 #include <chrono>
 #include <cmath>
+#include <type_traits>
 #include <utility>
 
 #include "Utils/Utils.h"
@@ -53,13 +54,58 @@ std::optional<CimScalar> parseBoolean(std::string_view text) {
 }
 
 /// With a point (DSP0004, realValue): without one, a whole number would be read back as an integer.
-std::string realText(double value) {
-    char buffer[40];
-    const auto [end, error] = std::to_chars(buffer, buffer + sizeof buffer, value);
+std::string_view realText(double value, CellBuffer& buffer) {
+    constexpr std::string_view kFraction = ".0";
+    char* const begin = buffer.data();
+    char* const last = begin + buffer.size() - kFraction.size();
+    auto [end, error] = std::to_chars(begin, last, value);
     if (error != std::errc()) return "0.0";
-    std::string text(buffer, end);
-    if (!std::isfinite(value) || text.find('.') != std::string::npos) return text;
-    return text.insert(std::min(text.find('e'), text.size()), ".0");
+    if (std::isfinite(value) && std::find(begin, end, '.') == end) {
+        char* const exponent = std::find(begin, end, 'e');
+        std::copy_backward(exponent, end, end + kFraction.size());
+        std::ranges::copy(kFraction, exponent);
+        end += kFraction.size();
+    }
+    return {begin, end};
+}
+
+std::string_view integerText(auto number, CellBuffer& buffer) {
+    return {buffer.data(), std::to_chars(buffer.data(), buffer.data() + buffer.size(), number).ptr};
+}
+
+/// Writes so many digits, which the number has at most, and leading zeros among them.
+char* putDigits(char* to, int number, int count) {
+    for (char* digit = to + count; digit != to; number /= 10)
+        *--digit = static_cast<char>('0' + number % 10);
+    return to + count;
+}
+
+char* putText(char* to, std::string_view text) {
+    return std::ranges::copy(text, to).out;
+}
+
+std::string_view timeText(utils::Time time, CellBuffer& buffer) {
+    int year = 0;
+    int month = 0;
+    int day = 0;
+    int hour = 0;
+    int minute = 0;
+    int second = 0;
+    time.get(year, month, day, hour, minute, second);
+    char* end = buffer.data();
+    if (time.isPeriod()) {
+        end = putDigits(end, std::min(day, kMaxDays), 8);
+    } else {
+        end = putDigits(end, std::min(year, 9999), 4);
+        end = putDigits(end, month, 2);
+        end = putDigits(end, day, 2);
+    }
+    for (const int part : {hour, minute, second})
+        end = putDigits(end, part, 2);
+    end = putText(end, ".");
+    end = putDigits(end, static_cast<int>(time.getMiliseconds() % 1000), 3);
+    end = putText(end, time.isPeriod() ? "000:000" : "000+000");
+    return {buffer.data(), end};
 }
 
 /// Paths write texts, references and datetimes in quotes, so a text that was read from a path may stand for
@@ -140,17 +186,72 @@ bool sameValue(const CimScalar& left, const CimScalar& right) {
     return std::visit(SameValue{}, left, right);
 }
 
-std::string scalarText(const CimScalar& value) {
-    struct Writer {
-        std::string operator()(bool flag) const { return flag ? "TRUE" : "FALSE"; }
-        std::string operator()(std::uint64_t number) const { return std::to_string(number); }
-        std::string operator()(std::int64_t number) const { return std::to_string(number); }
-        std::string operator()(double number) const { return realText(number); }
-        std::string operator()(const std::string& text) const { return text; }
-        std::string operator()(const utils::Time& time) const { return datetimeText(time); }
-        std::string operator()(const CimPath& path) const { return path.toString(); }
+std::size_t hashOf(const CimCell& cell) {
+    struct Hash {
+        std::size_t operator()(bool flag) const { return flag ? 1 : 2; }
+        std::size_t operator()(std::uint64_t number) const { return std::hash<std::uint64_t>()(number); }
+        // Equal numbers of either sign are the same.
+        std::size_t operator()(std::int64_t number) const {
+            return (*this)(static_cast<std::uint64_t>(number));
+        }
+        // No key is one, and 0.0 equals -0.0.
+        std::size_t operator()(double) const { return 0; }
+        std::size_t operator()(std::string_view text) const { return std::hash<std::string_view>()(text); }
+        // A text may stand for it.
+        std::size_t operator()(const utils::Time& time) const {
+            CellBuffer buffer;
+            return (*this)(timeText(time, buffer));
+        }
     };
-    return std::visit(Writer{}, value);
+    return std::visit(Hash{}, cell);
+}
+
+std::size_t hashOf(const CimScalar& value) {
+    const auto* path = std::get_if<CimPath>(&value);
+    return path != nullptr ? path->hashOfKeys() : hashOf(cellOf(value));
+}
+
+std::string scalarText(const CimScalar& value) {
+    if (const auto* path = std::get_if<CimPath>(&value)) return path->toString();
+    CellBuffer buffer;
+    return std::string(cellText(cellOf(value), buffer));
+}
+
+CimScalar scalarOf(const CimCell& cell) {
+    return std::visit(
+        [](const auto& seen) -> CimScalar {
+            if constexpr (std::is_same_v<decltype(seen), const std::string_view&>) {
+                return std::string(seen);
+            } else {
+                return seen;
+            }
+        },
+        cell);
+}
+
+CimCell cellOf(const CimScalar& value) {
+    return std::visit(
+        [](const auto& held) -> CimCell {
+            if constexpr (std::is_same_v<decltype(held), const CimPath&>) {
+                throw std::bad_variant_access();
+            } else {
+                return held;
+            }
+        },
+        value);
+}
+
+std::string_view cellText(const CimCell& cell, CellBuffer& buffer) {
+    struct Writer {
+        std::string_view operator()(bool flag) const { return flag ? "TRUE" : "FALSE"; }
+        std::string_view operator()(std::uint64_t number) const { return integerText(number, to); }
+        std::string_view operator()(std::int64_t number) const { return integerText(number, to); }
+        std::string_view operator()(double number) const { return realText(number, to); }
+        std::string_view operator()(std::string_view text) const { return text; }
+        std::string_view operator()(const utils::Time& time) const { return timeText(time, to); }
+        CellBuffer& to;
+    };
+    return std::visit(Writer{buffer}, cell);
 }
 
 std::string valueText(const CimValue& value, std::size_t enough) {
@@ -199,20 +300,8 @@ std::optional<CimScalar> convertScalar(CimType type, const CimScalar& value) {
 }
 
 std::string datetimeText(utils::Time time) {
-    int year = 0;
-    int month = 0;
-    int day = 0;
-    int hour = 0;
-    int minute = 0;
-    int second = 0;
-    time.get(year, month, day, hour, minute, second);
-    const int milliseconds = static_cast<int>(time.getMiliseconds() % 1000);
-    const std::string text =
-        time.isPeriod() ? utils::formatStr("%08d%02d%02d%02d.%03d000:000", std::min(day, kMaxDays), hour,
-                                           minute, second, milliseconds)
-                        : utils::formatStr("%04d%02d%02d%02d%02d%02d.%03d000+000", std::min(year, 9999),
-                                           month, day, hour, minute, second, milliseconds);
-    return text.substr(0, kDatetimeLength);
+    CellBuffer buffer;
+    return std::string(timeText(time, buffer));
 }
 
 std::optional<utils::Time> parseDatetime(std::string_view text) {

@@ -2,6 +2,7 @@
 #pragma once
 
 #include <algorithm>
+#include <array>
 #include <cstdint>
 #include <optional>
 #include <string>
@@ -65,6 +66,10 @@ class QUENX_EXPORT CimPath {
     /// As above, against the instance's class and current key values, without building its path.
     bool isSameObjectAs(const CimInstance& instance) const;
 
+    /// The same for paths that name the same object, unless one holds as a text what the other holds as a
+    /// reference; of few others. Class and namespace are not in it.
+    std::size_t hashOfKeys() const;
+
   private:
     bool parse(std::string_view text);
 
@@ -79,6 +84,16 @@ class QUENX_EXPORT CimPath {
 /// reals as double, string and char16 as text.
 using CimScalar = std::variant<bool, std::uint64_t, std::int64_t, double, std::string, utils::Time, CimPath>;
 
+/// A value that is no reference, seen where it is held; good while it stays there.
+using CimCell = std::variant<bool, std::uint64_t, std::int64_t, double, std::string_view, utils::Time>;
+/// A copy of what is seen, and the other way round. A reference cannot be seen so: std::bad_variant_access.
+CimScalar scalarOf(const CimCell& cell);
+QUENX_EXPORT CimCell cellOf(const CimScalar& value);
+
+/// The text of the value, in the buffer unless it is a text already.
+using CellBuffer = std::array<char, 40>;
+QUENX_EXPORT std::string_view cellText(const CimCell& cell, CellBuffer& buffer);
+
 /// One key of an object path.
 struct CimKey {
     std::string name;
@@ -89,6 +104,10 @@ struct CimKey {
 /// text and a reference are equal when the text parses to that path, a text and a datetime when it is that
 /// datetime's text form, since object paths write all three in quotes.
 QUENX_EXPORT bool sameValue(const CimScalar& left, const CimScalar& right);
+
+/// The same for values that are the same by that, but for a text and a reference.
+std::size_t hashOf(const CimCell& cell);
+std::size_t hashOf(const CimScalar& value);
 
 /// A typed value, an array of such, or null (DSP0004 5.2.5). An empty array is not null.
 struct QUENX_EXPORT CimValue {

@@ -1,10 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Providers/SoftwareInventory/Firmware.h"
 
-#include <sys/stat.h>
-
 #include <algorithm>
 #include <cinttypes>
+#include <set>
+#include <utility>
 
 #include "MidAPI/Image/RomFormat.h"
 #include "Utils/Log.h"
@@ -80,10 +80,6 @@ void addInstalled(std::vector<Firmware>& installed, const Port& port, const ma::
 /// Larger than any chain of images of one card; keeps a stray disk image out of memory.
 constexpr std::int64_t kMaxFileSize = 256LL * 1024 * 1024;
 
-std::int64_t nanoseconds(const timespec& time) {
-    return static_cast<std::int64_t>(time.tv_sec) * 1'000'000'000 + time.tv_nsec;
-}
-
 /// The bytes of a file that begins as a ROM does; otherwise nothing, and the reason.
 /// @param isUnread  set when the file may have more than could be read
 std::vector<std::uint8_t> readRom(const std::string& path, std::int64_t size, std::string& problem,
@@ -104,6 +100,15 @@ std::vector<std::uint8_t> readRom(const std::string& path, std::int64_t size, st
         isUnread = true;
     }
     return {};
+}
+
+utils::StringArray pathsIn(const utils::StringArray& directories) {
+    utils::StringArray paths;
+    for (const std::string& directory : directories) {
+        for (const std::string& name : os::listDirectory(directory))
+            paths.push_back(std::string(directory).append("/").append(name));
+    }
+    return paths;
 }
 
 }  // namespace
@@ -131,21 +136,12 @@ std::vector<Firmware> readInstalled(const std::vector<Port>& ports) {
     return installed;
 }
 
-bool FirmwareCatalog::takeStamp(const std::string& path, Stamp& stamp) {
-    struct stat info {};
-    // One that is not there any more keeps its empty stamp, and reading it finds out.
-    if (::stat(path.c_str(), &info) != 0) return true;
-    if (!S_ISREG(info.st_mode)) return false;
-    stamp = {info.st_dev, info.st_ino, info.st_size, nanoseconds(info.st_mtim), nanoseconds(info.st_ctim)};
-    return true;
-}
-
-FirmwareCatalog::Entry FirmwareCatalog::read(const std::string& path, const Stamp& stamp,
+FirmwareCatalog::Entry FirmwareCatalog::read(const std::string& path, const os::FileState& state,
                                              const Entry* before) {
     QUENX_DEBUG("Reading firmware file '%s'", path.c_str());
-    Entry entry{stamp};
+    Entry entry{state};
     std::string problem;
-    const std::vector<std::uint8_t> bytes = readRom(path, stamp.size, problem, entry.isUnread);
+    const std::vector<std::uint8_t> bytes = readRom(path, state.size, problem, entry.isUnread);
     if (problem.empty()) {
         const ma::RomFile rom = ma::parseOptionRom(bytes);
         if (!rom.error) {
@@ -154,33 +150,70 @@ FirmwareCatalog::Entry FirmwareCatalog::read(const std::string& path, const Stam
         }
         problem = *rom.error;
     }
-    const bool isKnown = before != nullptr && before->isUnread && entry.isUnread && before->stamp == stamp;
+    const bool isKnown = before != nullptr && before->isUnread && entry.isUnread && before->state == state;
     if (!isKnown) QUENX_ERROR("Firmware file '%s' is skipped: %s", path.c_str(), problem.c_str());
     return entry;
 }
 
-FirmwareCatalog::Files FirmwareCatalog::scan() {
-    const utils::StringArray directories = utils::SMASHv2Config::getInstance()->getFirmwareFilesPaths();
+bool FirmwareCatalog::isCurrent(const utils::StringArray& directories) const {
+    if (m_content == nullptr || !m_watch.isQuiet(directories)) return false;
+    for (const std::string& path : m_unwatched)
+        if (m_known.at(path).isOutdated(os::stateOf(path))) return false;
+    return true;
+}
+
+FirmwareCatalog::Entry FirmwareCatalog::lookAt(const std::string& path) const {
+    const os::FileState state = os::stateOf(path);
+    const auto known = m_known.find(path);
+    const Entry* before = known == m_known.end() ? nullptr : &known->second;
+    if (before != nullptr && !before->isOutdated(state)) return *before;
+    return state.isOther ? Entry{state} : read(path, state, before);
+}
+
+namespace {
+
+/// Those that are configured, and that of each image that was sent.
+utils::StringArray imageDirectories() {
+    utils::SMASHv2Config* const config = utils::SMASHv2Config::getInstance();
+    utils::StringArray directories = config->getFirmwareFilesPaths();
+    const std::string uploads = config->getUploadDirectory();
+    if (uploads.empty()) return directories;
+    for (const std::string& image : os::listDirectory(uploads))
+        directories.push_back(uploads + "/" + image);
+    return directories;
+}
+
+}  // namespace
+
+std::shared_ptr<const FirmwareContent> FirmwareCatalog::scan() {
+    const utils::StringArray directories = imageDirectories();
     // Held while files are read, so that two requests at once do not read each new file twice.
     const utils::Mutex::AutoLocker lock(m_mutex);
-    Files files;
+    if (isCurrent(directories)) return m_content;
+    const std::shared_ptr<const FirmwareContent> before = std::exchange(m_content, nullptr);
+    // First, so that what changes while the files are looked at makes another scan.
+    m_watch.watch(directories);
     Entries entries;
-    for (const std::string& directory : directories) {
-        for (const std::string& name : os::listDirectory(directory)) {
-            std::string path = directory;
-            path.append("/").append(name);
-            Stamp stamp;
-            // A directory that the configuration lists twice is served once.
-            if (entries.contains(path) || !takeStamp(path, stamp)) continue;
-            const auto known = m_known.find(path);
-            const Entry* before = known == m_known.end() ? nullptr : &known->second;
-            const bool isCurrent = before != nullptr && !before->isOutdated(stamp);
-            const Entry& entry = entries[path] = isCurrent ? *before : read(path, stamp, before);
-            if (entry.file != nullptr) files.push_back(entry.file);
-        }
+    std::vector<std::string> unwatched;
+    std::set<std::string> identifiers;
+    FirmwareContent content;
+    for (const std::string& path : pathsIn(directories)) {
+        // A directory that the configuration lists twice is served once.
+        const auto [place, isNew] = entries.try_emplace(path);
+        if (!isNew) continue;
+        const Entry& entry = place->second = lookAt(path);
+        if (entry.isUnread || !m_watch.sees(entry.state)) unwatched.push_back(path);
+        if (entry.file == nullptr) continue;
+        content.files.push_back(*entry.file);
+        // Equal files are one firmware with several resources.
+        if (identifiers.insert(entry.file->firmware.identifier).second)
+            content.firmware.push_back(entry.file->firmware);
     }
     m_known = std::move(entries);
-    return files;
+    m_unwatched = std::move(unwatched);
+    const bool isSame = before != nullptr && *before == content;
+    m_content = isSame ? before : std::make_shared<FirmwareContent>(std::move(content));
+    return m_content;
 }
 
 }  // namespace inventory

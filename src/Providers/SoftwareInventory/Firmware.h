@@ -12,7 +12,9 @@
 #include "MidAPI/Image/OptionRom.h"
 #include "Providers/Schema/ProviderInterfaces.h"
 #include "Providers/SoftwareInventory/Devices.h"
+#include "Utils/Os/Linux/FolderWatch.h"
 #include "Utils/Os/Linux/Mutex.h"
+#include "Utils/StringArray.h"
 
 namespace inventory {
 
@@ -62,45 +64,46 @@ struct FirmwareFile {
     bool operator==(const FirmwareFile&) const = default;
 };
 
+/// What the configured firmware directories hold. Never changes.
+struct FirmwareContent {
+    std::vector<FirmwareFile> files;   ///< directory by directory in the configured order, by name in each
+    std::vector<Firmware> firmware{};  ///< each that is in them, in the order of its first file
+
+    bool operator==(const FirmwareContent&) const = default;
+};
+
 /// The option-ROM files in the configured firmware directories. A file is read once and again only when it
 /// has changed; one that is broken is left out, with one log line when that is found out. So is one that
-/// cannot be read, which is tried again at each look. Thread-safe.
+/// cannot be read, which is tried again at each look. Files are looked at one by one only when something has
+/// happened in their directories, or where the system would not tell. Thread-safe.
 class FirmwareCatalog {
   public:
-    using Files = std::vector<std::shared_ptr<const FirmwareFile>>;
-
-    /// The files that there are now, directory by directory in the configured order, by name in each.
-    Files scan();
+    /// What there is now: the object of the last time while that is the same. Never null.
+    std::shared_ptr<const FirmwareContent> scan();
 
   private:
-    /// What changes with a file's content or with the right to read it. All zero for a file that is not
-    /// there.
-    struct Stamp {
-        std::uint64_t device = 0;
-        std::uint64_t inode = 0;
-        std::int64_t size = 0;
-        std::int64_t modified = 0;  ///< nanoseconds, as is the next
-        std::int64_t changed = 0;
-
-        bool operator==(const Stamp&) const = default;
-    };
     struct Entry {
-        Stamp stamp;
+        os::FileState state;
         std::shared_ptr<const FirmwareFile> file = nullptr;  ///< null for one that is left out
         bool isUnread = false;                               ///< what is in it is not known yet
 
-        /// Whether the file has to be read for this stamp.
-        bool isOutdated(const Stamp& now) const { return isUnread || stamp != now; }
+        /// Whether the file has to be read in this state.
+        bool isOutdated(const os::FileState& now) const { return isUnread || state != now; }
     };
     using Entries = std::map<std::string, Entry>;
 
-    /// Takes the file's stamp. False for a directory, a device and the like.
-    static bool takeStamp(const std::string& path, Stamp& stamp);
     /// @param before  what was known of the file; null when it is new
-    static Entry read(const std::string& path, const Stamp& stamp, const Entry* before);
+    static Entry read(const std::string& path, const os::FileState& state, const Entry* before);
+
+    bool isCurrent(const utils::StringArray& directories) const QUENX_REQUIRES(m_mutex);
+    Entry lookAt(const std::string& path) const QUENX_REQUIRES(m_mutex);
 
     utils::Mutex m_mutex;
+    os::FolderWatch m_watch QUENX_GUARDED_BY(m_mutex);
     Entries m_known QUENX_GUARDED_BY(m_mutex);
+    std::vector<std::string> m_unwatched QUENX_GUARDED_BY(m_mutex);  ///< those of which m_watch tells nothing
+    /// Null before the first scan, and after one that failed.
+    std::shared_ptr<const FirmwareContent> m_content QUENX_GUARDED_BY(m_mutex);
 };
 
 }  // namespace inventory

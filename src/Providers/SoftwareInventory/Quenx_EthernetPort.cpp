@@ -58,6 +58,10 @@ core::InstanceList::Iterator Quenx_EthernetPortClass::getInstances() {
     return serve(inventory::readPorts());
 }
 
+core::CimInstance* Quenx_EthernetPortClass::findInstance(const core::CimPath& path) {
+    return find(inventory::readPorts(), path);
+}
+
 void Quenx_EthernetPortRegisteredProfile::refresh() {
     // The version is that of DSP1014.
     registerProfile(*this, kEthernetPortProfile, "Ethernet Port", "1.0.1",

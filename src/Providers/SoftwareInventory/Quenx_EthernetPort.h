@@ -33,6 +33,7 @@ class Quenx_EthernetPort final : public CIM_EthernetPort, public inventory::Ethe
 class Quenx_EthernetPortClass : public CachedClass<Quenx_EthernetPort, inventory::Port> {
   public:
     core::InstanceList::Iterator getInstances() override;
+    core::CimInstance* findInstance(const core::CimPath& path);
 };
 
 /// Says that the ports are modelled as DMTF DSP1014 has it. Served as "Quenx_RegisteredProfile", a class that

@@ -71,3 +71,7 @@ core::InstanceList::Iterator Quenx_PortControllerClass::getInstances() {
     const utils::TimeStamp time("Quenx_PortControllerClass::getInstances");
     return serve(inventory::groupByCard(inventory::readPorts()));
 }
+
+core::CimInstance* Quenx_PortControllerClass::findInstance(const core::CimPath& path) {
+    return find(inventory::groupByCard(inventory::readPorts()), path);
+}

@@ -45,4 +45,5 @@ class Quenx_PortController final : public CIM_PortController, public inventory::
 class Quenx_PortControllerClass : public CachedClass<Quenx_PortController, inventory::Card> {
   public:
     core::InstanceList::Iterator getInstances() override;
+    core::CimInstance* findInstance(const core::CimPath& path);
 };

@@ -2,7 +2,6 @@
 #include "Providers/SoftwareInventory/Quenx_SoftwareIdentity.h"
 
 #include <algorithm>
-#include <set>
 
 #include "Utils/Utils.h"
 
@@ -114,14 +113,16 @@ Quenx_SoftwareIdentityClass::Quenx_SoftwareIdentityClass(std::shared_ptr<invento
 core::InstanceList::Iterator Quenx_SoftwareIdentityClass::getInstances() {
     QUENX_DEBUG("getInstances");
     const utils::TimeStamp time("Quenx_SoftwareIdentityClass::getInstances");
-    std::vector<inventory::Firmware> all;
-    std::set<std::string> identifiers;
-    for (const auto& file : m_catalog->scan()) {
-        // Equal files are one firmware with several resources.
-        if (identifiers.insert(file->firmware.identifier).second) all.push_back(file->firmware);
-    }
-    for (inventory::Firmware& installed : inventory::readInstalled(inventory::readPorts())) {
-        all.push_back(std::move(installed));
-    }
-    return serve(all);
+    return serve(readAll());
+}
+
+core::CimInstance* Quenx_SoftwareIdentityClass::findInstance(const core::CimPath& path) {
+    return find(readAll(), path);
+}
+
+KeyParts<inventory::Firmware> Quenx_SoftwareIdentityClass::readAll() const {
+    const auto content = m_catalog->scan();
+    return {{content, &content->firmware},
+            std::make_shared<const std::vector<inventory::Firmware>>(
+                inventory::readInstalled(inventory::readPorts()))};
 }

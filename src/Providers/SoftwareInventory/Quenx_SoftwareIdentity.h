@@ -16,6 +16,8 @@ class Quenx_SoftwareIdentity final : public CIM_SoftwareIdentity, public invento
   public:
     static constexpr core::CimClassInfo classInfo{"Quenx_SoftwareIdentity", &CIM_SoftwareIdentity::classInfo};
 
+    static constexpr bool kFollowsFromKey = true;
+
     explicit Quenx_SoftwareIdentity(inventory::Firmware firmware);
     std::string getClassName() const override { return classInfo.name; }
 
@@ -44,7 +46,10 @@ class Quenx_SoftwareIdentityClass : public CachedClass<Quenx_SoftwareIdentity, i
   public:
     explicit Quenx_SoftwareIdentityClass(std::shared_ptr<inventory::FirmwareCatalog> catalog);
     core::InstanceList::Iterator getInstances() override;
+    core::CimInstance* findInstance(const core::CimPath& path);
 
   private:
+    KeyParts<inventory::Firmware> readAll() const;
+
     const std::shared_ptr<inventory::FirmwareCatalog> m_catalog;
 };

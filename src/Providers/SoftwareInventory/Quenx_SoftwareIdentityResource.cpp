@@ -32,8 +32,14 @@ Quenx_SoftwareIdentityResourceClass::Quenx_SoftwareIdentityResourceClass(
 core::InstanceList::Iterator Quenx_SoftwareIdentityResourceClass::getInstances() {
     QUENX_DEBUG("getInstances");
     const utils::TimeStamp time("Quenx_SoftwareIdentityResourceClass::getInstances");
-    std::vector<inventory::FirmwareFile> files;
-    for (const auto& file : m_catalog->scan())
-        files.push_back(*file);
-    return serve(files);
+    return serve(readAll());
+}
+
+core::CimInstance* Quenx_SoftwareIdentityResourceClass::findInstance(const core::CimPath& path) {
+    return find(readAll(), path);
+}
+
+KeyParts<inventory::FirmwareFile> Quenx_SoftwareIdentityResourceClass::readAll() const {
+    const auto content = m_catalog->scan();
+    return {{content, &content->files}};
 }

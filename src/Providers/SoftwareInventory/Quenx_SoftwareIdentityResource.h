@@ -13,6 +13,8 @@ class Quenx_SoftwareIdentityResource final : public CIM_SoftwareIdentityResource
     static constexpr core::CimClassInfo classInfo{"Quenx_SoftwareIdentityResource",
                                                   &CIM_SoftwareIdentityResource::classInfo};
 
+    static constexpr bool kFollowsFromKey = true;
+
     explicit Quenx_SoftwareIdentityResource(inventory::FirmwareFile file);
     std::string getClassName() const override { return classInfo.name; }
 
@@ -34,7 +36,10 @@ class Quenx_SoftwareIdentityResourceClass
   public:
     explicit Quenx_SoftwareIdentityResourceClass(std::shared_ptr<inventory::FirmwareCatalog> catalog);
     core::InstanceList::Iterator getInstances() override;
+    core::CimInstance* findInstance(const core::CimPath& path);
 
   private:
+    KeyParts<inventory::FirmwareFile> readAll() const;
+
     const std::shared_ptr<inventory::FirmwareCatalog> m_catalog;
 };

@@ -2,6 +2,7 @@
 #include <gtest/gtest.h>
 #include <sys/stat.h>
 
+#include <algorithm>
 #include <filesystem>
 
 #include "Providers/SoftwareUpdate/UpdateTest.h"
@@ -61,6 +62,37 @@ TEST_F(FirmwareTest, ComesAndGoesWithItsFile) {
     m_folder.write("b/efi-virtio.rom", test::realRom("efi-virtio"));
     EXPECT_EQ(table("Quenx_SoftwareIdentity", {"ElementName", "Manufacturer", "Name"}),
               Rows{"1af4:1041 IMG_PXE 1, IMG_UEFI 0; http://ipxe.org; iPXE"});
+}
+
+TEST_F(FirmwareTest, IsSeenHoweverItsFileChanges) {
+    // Three files: one in its place, one that a link leads to, and one with a name in another directory.
+    const std::vector<std::string> written{"a/one.rom", "beyond the link.rom", "second name.rom"};
+    for (const std::string& file : written)
+        m_folder.write(file, rom(1));
+    fs::create_symlink(m_folder / written[1], m_folder / "a/three.rom");
+    fs::create_hard_link(m_folder / written[2], m_folder / "a/two.rom");
+    const auto versions = [this] { return table("Quenx_SoftwareIdentity", {"MajorVersion"}); };
+    EXPECT_EQ(versions(), Rows{"1"}) << "equal files are one firmware";
+    for (std::uint32_t round = 0; round < 2; ++round) {
+        for (std::uint32_t version = 2; const std::string& file : written) {
+            // In its place, with the size and the time that it had.
+            const auto time = fs::last_write_time(m_folder / file);
+            m_folder.write(file, rom(version * 10 + round));
+            fs::last_write_time(m_folder / file, time);
+            const std::string text = std::to_string(version * 10 + round);
+            const Rows now = versions();
+            EXPECT_EQ(std::ranges::count(now, text), 1) << file << " in round " << round;
+            ++version;
+        }
+    }
+    EXPECT_EQ(versions(), (Rows{"21", "31", "41"}));
+
+    fs::rename(m_folder / "a", m_folder / "c");
+    EXPECT_EQ(versions(), Rows{});
+    m_folder.write("c/one.rom", rom(5));
+    fs::create_directory_symlink(m_folder / "c", m_folder / "a");
+    fs::remove(m_folder / "c/two.rom");
+    EXPECT_EQ(versions(), (Rows{"5", "31"}));
 }
 
 TEST_F(FirmwareTest, HasTheKindsOfWhatIsInIt) {
