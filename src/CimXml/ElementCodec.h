@@ -114,11 +114,25 @@ void writeValue(XmlWriter& writer, const core::CimValue& value);
 /// VALUE with a text.
 void writeText(XmlWriter& writer, std::string_view text);
 
+/// VALUE of a cell, and KEYVALUE.
+void writeCell(XmlWriter& writer, const core::CimCell& cell);
+void writeKeyValue(XmlWriter& writer, const core::CimCell& cell);
+
 /// PARAMVALUE, with its type unless the argument has none of its own.
 void writeArgument(XmlWriter& writer, const core::Argument& argument);
 
 /// The element of a property of that type: PROPERTY, PROPERTY.ARRAY or PROPERTY.REFERENCE.
 std::string_view propertyElement(core::CimType type, bool isArray);
+
+/// The start of that element, with its name and type.
+void startProperty(XmlWriter& writer, std::string_view name, core::CimType type, bool isArray);
+
+/// What an enumeration answers for an instance: VALUE.NAMEDINSTANCE.
+void writeNamedInstance(XmlWriter& writer, const core::InstanceValue& instance);
+
+/// The response message of an intrinsic operation, up to what IRETURNVALUE holds, and behind it.
+void startResult(XmlWriter& writer, std::string_view messageId, std::string_view operation);
+void endResult(XmlWriter& writer);
 
 /// CLASS. The flavors of its qualifiers are those of their declarations.
 void writeClass(XmlWriter& writer, const core::ClassDeclaration& declaration);

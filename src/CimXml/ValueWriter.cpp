@@ -10,12 +10,20 @@ namespace {
 
 using core::CimType;
 
-void writeContent(XmlWriter& writer, const core::CimScalar& value) {
-    // Most values are texts, and copying one only to escape it costs as much again.
-    if (const auto* text = std::get_if<std::string>(&value)) {
-        writer.text(*text);
+/// In the order of the types of a scalar. A cell has the same, but for the last.
+constexpr std::array kHeldTypes{CimType::Boolean, CimType::Uint64,   CimType::Sint64,   CimType::Real64,
+                                CimType::String,  CimType::Datetime, CimType::Reference};
+static_assert(kHeldTypes.size() == std::variant_size_v<core::CimScalar>);
+static_assert(kHeldTypes.size() - 1 == std::variant_size_v<core::CimCell>);
+
+void writeContent(XmlWriter& writer, const core::CimCell& cell) {
+    core::CellBuffer buffer;
+    const std::string_view text = core::cellText(cell, buffer);
+    // Only texts can hold what has to be escaped.
+    if (std::holds_alternative<std::string_view>(cell)) {
+        writer.text(text);
     } else {
-        writer.text(core::scalarText(value));
+        writer.raw(text);
     }
 }
 
@@ -31,19 +39,6 @@ void writeReference(XmlWriter& writer, const core::CimPath& path) {
     writer.end("VALUE.REFERENCE");
 }
 
-/// KEYVALUE. Old clients know VALUETYPE alone, and TYPE tells apart what it throws together. A number is held
-/// without its width, and a wrong TYPE would be worse than none.
-void writeKeyValue(XmlWriter& writer, const core::CimScalar& value) {
-    const CimType type = typeOfScalar(value);
-    const bool isNumber = core::isUnsigned(type) || core::isSigned(type) || core::isReal(type);
-    writer.start("KEYVALUE");
-    writer.attribute("VALUETYPE", type == CimType::Boolean ? "boolean" : isNumber ? "numeric" : "string");
-    if (!isNumber) writer.attribute("TYPE", core::typeName(type));
-    writer.content();
-    writeContent(writer, value);
-    writer.end("KEYVALUE");
-}
-
 void writeScalar(XmlWriter& writer, CimType type, const core::CimScalar& value) {
     if (const auto* path = std::get_if<core::CimPath>(&value)) {
         writeReference(writer, *path);
@@ -51,19 +46,33 @@ void writeScalar(XmlWriter& writer, CimType type, const core::CimScalar& value) 
         // Held as the text that somebody typed.
         writeReference(writer, core::CimPath(core::scalarText(value)));
     } else {
-        writer.open("VALUE");
-        writeContent(writer, value);
-        writer.end("VALUE");
+        writeCell(writer, core::cellOf(value));
     }
 }
 
 }  // namespace
 
 CimType typeOfScalar(const core::CimScalar& value) {
-    constexpr std::array kTypes{CimType::Boolean, CimType::Uint64,   CimType::Sint64,   CimType::Real64,
-                                CimType::String,  CimType::Datetime, CimType::Reference};
-    static_assert(kTypes.size() == std::variant_size_v<core::CimScalar>);
-    return kTypes[value.index()];
+    return kHeldTypes[value.index()];
+}
+
+void writeCell(XmlWriter& writer, const core::CimCell& cell) {
+    writer.raw("<VALUE>");
+    writeContent(writer, cell);
+    writer.raw("</VALUE>");
+}
+
+// Old clients know VALUETYPE alone, and TYPE tells apart what it throws together. A number is held without
+// its width, and a wrong TYPE would be worse than none.
+void writeKeyValue(XmlWriter& writer, const core::CimCell& cell) {
+    const CimType type = kHeldTypes[cell.index()];
+    const bool isNumber = core::isUnsigned(type) || core::isSigned(type) || core::isReal(type);
+    writer.start("KEYVALUE");
+    writer.attribute("VALUETYPE", type == CimType::Boolean ? "boolean" : isNumber ? "numeric" : "string");
+    if (!isNumber) writer.attribute("TYPE", core::typeName(type));
+    writer.content();
+    writeContent(writer, cell);
+    writer.end("KEYVALUE");
 }
 
 void writeNamespace(XmlWriter& writer, std::string_view namespaceName) {
@@ -87,7 +96,7 @@ void writeInstanceName(XmlWriter& writer, const core::CimPath& path) {
         if (const auto* reference = std::get_if<core::CimPath>(&key.value)) {
             writeReference(writer, *reference);
         } else {
-            writeKeyValue(writer, key.value);
+            writeKeyValue(writer, core::cellOf(key.value));
         }
         writer.end("KEYBINDING");
     }

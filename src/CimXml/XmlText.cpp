@@ -59,8 +59,14 @@ std::string_view entityOf(char special) {
 /// The length of the run at the front that needs no change.
 std::size_t plainRun(std::string_view text) {
     std::size_t length = 0;
-    while (length < text.size() && kindOf(text[length]) == ByteKind::Plain)
-        ++length;
+    while (length < text.size()) {
+        const ByteKind kind = kindOf(text[length]);
+        const std::size_t step = kind == ByteKind::Plain   ? 1
+                                 : kind == ByteKind::Multi ? xmlCharacterLength(text.substr(length))
+                                                           : 0;
+        if (step == 0) break;
+        length += step;
+    }
     return length;
 }
 
@@ -89,11 +95,7 @@ std::size_t xmlCharacterLength(std::string_view text) {
 
 bool isXmlText(std::string_view text) {
     while (!text.empty()) {
-        const ByteKind kind = kindOf(text[0]);
-        const std::size_t length = kind == ByteKind::Multi       ? xmlCharacterLength(text)
-                                   : kind == ByteKind::Forbidden ? 0
-                                   : kind == ByteKind::Special   ? 1
-                                                                 : plainRun(text);
+        const std::size_t length = kindOf(text[0]) == ByteKind::Special ? 1 : plainRun(text);
         if (length == 0) return false;
         text.remove_prefix(length);
     }
@@ -101,13 +103,13 @@ bool isXmlText(std::string_view text) {
 }
 
 void appendEscaped(std::string& out, std::string_view text) {
-    while (!text.empty()) {
-        std::size_t length = 1;
+    for (;;) {
+        const std::size_t length = plainRun(text);
+        out.append(text.substr(0, length));
+        text.remove_prefix(length);
+        if (text.empty()) return;
         switch (kindOf(text[0])) {
             case ByteKind::Plain:
-                length = plainRun(text);
-                out.append(text.substr(0, length));
-                break;
             case ByteKind::Special:
                 out.append(entityOf(text[0]));
                 break;
@@ -115,16 +117,11 @@ void appendEscaped(std::string& out, std::string_view text) {
                 // A character reference to it would be just as ill-formed, so it has to go.
                 break;
             case ByteKind::Multi:
-                if (const std::size_t known = xmlCharacterLength(text); known != 0) {
-                    length = known;
-                    out.append(text.substr(0, length));
-                } else {
-                    // Visible, unlike a byte that is dropped: whoever reads it sees that something was there.
-                    out.append("\xEF\xBF\xBD");
-                }
+                // Visible, unlike a byte that is dropped: whoever reads it sees that something was there.
+                out.append("\xEF\xBF\xBD");
                 break;
         }
-        text.remove_prefix(length);
+        text.remove_prefix(1);
     }
 }
 
