@@ -10,6 +10,10 @@ install(TARGETS ${quenx_libraries} DESTINATION lib/quenx)
 # Where object managers look for providers.
 set_target_properties(Quenx_Cmpi PROPERTIES INSTALL_RPATH "$ORIGIN/../quenx")
 install(TARGETS Quenx_Cmpi DESTINATION lib/cmpi)
+if(TARGET Quenx_History)
+    set_target_properties(Quenx_History PROPERTIES INSTALL_RPATH "$ORIGIN/..")
+    install(TARGETS Quenx_History DESTINATION lib/quenx/history)
+endif()
 install(TARGETS quenxctl DESTINATION bin)
 install(TARGETS quenx-cimd DESTINATION sbin)
 
@@ -18,6 +22,7 @@ install(FILES ${CMAKE_BINARY_DIR}/quenx-cimd.service DESTINATION lib/systemd/sys
 install(FILES packaging/tmpfiles.d/quenx.conf DESTINATION lib/tmpfiles.d)
 install(DIRECTORY docs/ DESTINATION share/doc/quenx)
 install(FILES CHANGELOG.md LICENSE DESTINATION share/doc/quenx)
+install(DIRECTORY ansible/ DESTINATION share/ansible/collections/ansible_collections/quenx/adapters)
 install(FILES packaging/adapters.toml packaging/devlink.toml packaging/policy.toml packaging/quenx-cimd.toml
     packaging/quenx-cimprovider.conf
     DESTINATION share/doc/quenx/examples)

@@ -67,6 +67,7 @@ struct IntrinsicResult {
     std::vector<core::QualifierDeclaration> qualifiers = {};
     std::vector<core::Argument> outputs = {};
     std::shared_ptr<const Origins> origins = {};  ///< null when class origins are not asked for
+    bool isStreamed = false;                      ///< the instances went to a stream instead
 };
 /// What its instances and paths take, as their buffers have it: a small element may become a large value.
 std::size_t bytesOf(const IntrinsicResult& result);

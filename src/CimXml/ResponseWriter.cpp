@@ -20,13 +20,9 @@ const ClassOrigins* originsOf(const Origins* origins, const std::string& classNa
 
 void writeProperty(XmlWriter& writer, const core::PropertyValue& property, const ClassOrigins* origins) {
     const std::string_view element = propertyElement(property.value.type, property.value.isArray);
-    writer.start(element).attribute("NAME", property.name);
-    // PROPERTY.REFERENCE has no attribute TYPE (DSP0201 5.2.4.3), and there are readers that fail on one.
-    if (element == "PROPERTY.REFERENCE") {
-        if (!property.referenceClass.empty()) writer.attribute("REFERENCECLASS", property.referenceClass);
-    } else {
-        writer.attribute("TYPE", core::typeName(property.value.type));
-    }
+    startProperty(writer, property.name, property.value.type, property.value.isArray);
+    if (element == "PROPERTY.REFERENCE" && !property.referenceClass.empty())
+        writer.attribute("REFERENCECLASS", property.referenceClass);
     if (origins != nullptr) {
         const auto found = origins->find(core::foldName(property.name));
         if (found != origins->end()) writer.attribute("CLASSORIGIN", found->second);
@@ -156,6 +152,28 @@ std::string write(AnyResponse& response, const std::function<void(std::size_t)>&
 }
 
 }  // namespace
+
+void startProperty(XmlWriter& writer, std::string_view name, core::CimType type, bool isArray) {
+    const std::string_view element = propertyElement(type, isArray);
+    writer.start(element).attribute("NAME", name);
+    // PROPERTY.REFERENCE has no attribute TYPE (DSP0201 5.2.4.3), and there are readers that fail on one.
+    if (element != "PROPERTY.REFERENCE") writer.attribute("TYPE", core::typeName(type));
+}
+
+void writeNamedInstance(XmlWriter& writer, const core::InstanceValue& instance) {
+    const IntrinsicResult result{.kind = ResultKind::NamedInstances};
+    ResultWriter{writer, result, {}}.write(instance);
+}
+
+void startResult(XmlWriter& writer, std::string_view messageId, std::string_view operation) {
+    startEnvelope(writer, messageId, "SIMPLERSP");
+    writer.start("IMETHODRESPONSE").attribute("NAME", operation).content().open("IRETURNVALUE");
+}
+
+void endResult(XmlWriter& writer) {
+    writer.end("IRETURNVALUE").end("IMETHODRESPONSE");
+    endEnvelope(writer, "SIMPLERSP");
+}
 
 std::string writeResponse(const Response& response) {
     return write(response, {});

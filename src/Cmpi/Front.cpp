@@ -39,6 +39,8 @@ std::unique_ptr<core::ProviderSession> openSession() {
     auto session = std::make_unique<core::ProviderSession>("");
     // Object managers give a call up after 40 seconds: 5 are more for the whole file, 15 for the adapter.
     utils::SMASHv2Config::getInstance()->setDefaultImageReadTimeout(std::chrono::seconds(20));
+    if (const std::string problem = session->loadHistory(); !problem.empty())
+        utils::writeAuditLog("[history] No record is kept of updates: " + utils::escapeForLog(problem, 400));
     session->libraries().load(directory);
     for (const ProviderLibraries::Problem& problem : session->libraries().problems())
         QUENX_ERROR("Cannot load %s: %s", problem.file.c_str(), problem.reason.c_str());

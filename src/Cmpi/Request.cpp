@@ -3,7 +3,7 @@
 
 #include "Cmpi/Slots.h"
 #include "Framework/Requests/Audit.h"
-#include "Framework/Requests/PolicyDecision.h"
+#include "Framework/Requests/Caller.h"
 
 namespace cmpi {
 
@@ -83,6 +83,7 @@ Request::Request(const Sender& sender)
       m_use(sender.interface),
       m_place{Front::theOne().broker(), requestedNamespace(sender.object, operations().getNamespace()),
               operations().getNamespace()},
+      m_scope(caller()),
       m_object(pathFrom(m_place, sender.object)) {}
 
 void Request::take(Status status) const {
@@ -114,16 +115,18 @@ std::string Request::contextEntry(const char* name) const {
     return text == nullptr ? "" : *text;
 }
 
+core::Caller Request::caller() const {
+    const BrokerTable* table = m_place.broker.bft;
+    const std::string manager = "cmpi:" + textOf(table == nullptr ? nullptr : table->brokerName);
+    return {.principal = contextEntry("CMPIPrincipal"), .address = manager, .front = manager};
+}
+
 void Request::audited(const std::string& operation, const std::vector<core::Argument>& arguments,
                       const std::function<std::string()>& work) const {
-    const BrokerTable* manager = m_place.broker.bft;
     core::CimPath target = m_object;
     target.setNamespace(m_place.requested);
-    core::AuditEvent event{contextEntry("CMPIPrincipal"),
-                           "cmpi:" + textOf(manager == nullptr ? nullptr : manager->brokerName), operation,
-                           target.toString(), ""};
+    core::AuditEvent event{core::CallerScope::current(), operation, target.toString(), ""};
     try {
-        const core::CallerScope scope({.principal = event.user});
         event.outcome = work();
     } catch (const CimError& error) {
         event.outcome = core::outcomeOf(error.status(), error.what());

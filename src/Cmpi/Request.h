@@ -6,6 +6,7 @@
 
 #include "Cmpi/Front.h"
 #include "Cmpi/Values.h"
+#include "Framework/Requests/Caller.h"
 #include "Framework/Requests/CimOperations.h"
 
 namespace cmpi {
@@ -49,10 +50,12 @@ class Request {
 
   private:
     void take(Status status) const;
+    core::Caller caller() const;
 
     const Sender& m_sender;
     const Front::Use m_use;
     Place m_place;
+    const core::CallerScope m_scope;
     core::CimPath m_object;
 };
 

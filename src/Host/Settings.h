@@ -64,6 +64,13 @@ struct JobSettings {
     std::chrono::seconds keepFor{0};  ///< how long, from their end
 };
 
+/// Images that administrators send, see Spool.
+struct UploadSettings {
+    std::string directory = "/var/lib/quenx/images";  ///< empty: none are taken
+    std::size_t imageBytes = 256U << 20;              ///< of one file
+    std::size_t totalBytes = 1U << 30;                ///< of all; beyond it the oldest go
+};
+
 /// What the configuration file and the options say. Field by field documented in packaging/quenx-cimd.toml.
 struct Settings {
     ListenSettings listen;
@@ -72,6 +79,7 @@ struct Settings {
     ServerLimits limits;
     PullLimits pulls;
     JobSettings jobs;
+    UploadSettings uploads;
     std::string providers;              ///< directory of the provider libraries
     std::string providerConfiguration;  ///< empty: the providers' own default
     std::string policy;                 ///< file of the policy; empty: the machine's

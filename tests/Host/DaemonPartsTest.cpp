@@ -6,6 +6,7 @@
 #include <fstream>
 
 #include "Host/Authentication/PasswordChecker.h"
+#include "Host/Control/Spool.h"
 #include "Host/Daemon/CommandLine.h"
 #include "Host/Daemon/Daemon.h"
 #include "Host/Daemon/Report.h"
@@ -100,6 +101,17 @@ TEST(ServerCertificateTest, IsRenewedOnlyIfMadeByAnUnsetClock) {
     EXPECT_EQ(warning(), "");
     fs::remove(files.key);
     EXPECT_THROW(host::makeTlsFiles(files), std::runtime_error) << "for the certificate that is there";
+}
+
+TEST(SpoolTest, RemovesWhatAKilledDaemonHasLeftOfAnUpload) {
+    const test::TempFolder folder;
+    for (const char* name : {"images", "images/a"})
+        fs::create_directory(folder / name);
+    folder.write("images/.part-x", "half");
+    folder.write("images/a/new.rom", "whole");
+    const host::Spool spool({.directory = folder / "images"});
+    EXPECT_FALSE(fs::exists(folder / "images/.part-x"));
+    EXPECT_TRUE(fs::exists(folder / "images/a/new.rom"));
 }
 
 TEST(ReportTest, TellsTheServiceManagerAndKeepsNoDescriptor) {

@@ -52,6 +52,37 @@ TEST_F(DispatcherTest, ReadsInstancesAndTheirNeighbours) {
     EXPECT_EQ(call("References", {{"ObjectName", a}}).instances.size(), 2U);
 }
 
+TEST_F(DispatcherTest, StreamsWhatItAnswers) {
+    test::Gadget* odd = m_agent.add("<\x1F\xC3\xBC>", 7);
+    odd->Codes = {};
+    odd->Made = utils::Time(90061002003ULL);
+    m_agent.add("x")->ID.setNull();
+    m_agent.add("a", 1)->Codes = {5, 6};  // the same again
+    const ClassName gadgets{"Test_Gadget"};
+    const Given table[] = {
+        {{"ClassName", gadgets}},
+        {{"ClassName", ClassName{"Test_Thing"}}, {"DeepInheritance", "FALSE"}},
+        {{"ClassName", gadgets}, {"PropertyList", std::vector<std::string>{"MADE", "none", "codes"}}},
+        {{"ClassName", gadgets}, {"PropertyList", std::vector<std::string>()}},
+        {{"ClassName", gadgets}, {"IncludeClassOrigin", "TRUE"}},
+        {{"ClassName", ClassName{"Test_Link"}}},
+        {{"ClassName", ClassName{"Unknown"}}},
+    };
+    for (const Given& parameters : table) {
+        const cimxml::Request request{"<1>",
+                                      cimxml::IntrinsicCall{"enumerateinstances", m_namespace, parameters}};
+        host::AnswerCharge charge = m_dispatcher.charge(m_caller.user);
+        EXPECT_EQ(m_dispatcher.answer(request, m_caller, charge),
+                  cimxml::writeResponse(m_dispatcher.dispatch(request, m_caller, charge)));
+    }
+    for (unsigned int i = 0; i < 2000; ++i)
+        m_agent.add("more", i);
+    host::AnswerCharge charge = m_dispatcher.charge(m_caller.user);
+    const cimxml::Request all{"1", cimxml::IntrinsicCall{"EnumerateInstances", m_namespace, table[0]}};
+    const std::string text = m_dispatcher.answer(all, m_caller, charge);
+    EXPECT_NE(text.find("<ERROR CODE=\"27\""), std::string::npos) << text.size();
+}
+
 TEST_F(DispatcherTest, AnswersEachMistakeByItsStatus) {
     const ClassName unknown{"Unknown"};
     const ClassName known{"Test_Gadget"};
@@ -321,9 +352,9 @@ TEST_F(DispatcherTest, CountsTheRefusalsOfAFlood) {
     host::AuditTrail trail;
     const auto now = host::AuditTrail::Clock::now();
     for (int i = 0; i < 25; ++i)
-        trail.refused({i < 5 ? "a" : "b", "192.0.2.1", "Work", "t", "denied: x"}, {}, now);
+        trail.refused({{i < 5 ? "a" : "b", "192.0.2.1"}, "Work", "t", "denied: x"}, {}, now);
     for (int i = 0; i < 20; ++i)
-        trail.refused({"a", "192.0.2.1", "Work", "t", "denied: x"}, {}, now);
+        trail.refused({{"a", "192.0.2.1"}, "Work", "t", "denied: x"}, {}, now);
     trail.writeNumbers(now + std::chrono::seconds(59));
     EXPECT_EQ(test::SyslogCapture::count("[audit]"), 61U);
     trail.writeNumbers(now + std::chrono::seconds(60));
@@ -334,7 +365,7 @@ TEST_F(DispatcherTest, CountsTheRefusalsOfAFlood) {
     host::AuditTrail quick(std::chrono::milliseconds(1));
     test::SyslogCapture::clear();
     for (int i = 0; i < 21; ++i)
-        quick.refused({"b", "192.0.2.1", "Work", "t", "denied: x"}, {}, now);
+        quick.refused({{"b", "192.0.2.1"}, "Work", "t", "denied: x"}, {}, now);
     while (!test::SyslogCapture::contains("denied: 1 more"))
         std::this_thread::yield();
 }

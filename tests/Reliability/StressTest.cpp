@@ -154,17 +154,18 @@ class StressTest : public test::UpdateTest {
 TEST_F(StressTest, LosesNothing) {
     m_folder.write("quenx.conf", "ReleaseClaimAfterCheck=1\nFWFilePath=" + m_folder.path() + "\n");
     const std::int32_t executionsBefore = JobThread::executionCount;
-    run(std::chrono::milliseconds(300), [&] { return m_started >= 10; });
+    // Ends only when every outcome has come, on a busy machine the rarer ones take longer: what is kept from
+    // the first of each is there then.
+    const auto hasMetAll = [&] { return m_refused > 0 && m_checked > 0 && m_deleted > 0; };
+    run(std::chrono::milliseconds(300), [&] { return m_started >= 10 && hasMetAll(); });
     cleanUp();
     const std::int64_t before = test::liveBytes();
 
     const std::uint64_t wanted = m_started + test::effort.jobs;
-    // Ends only when every outcome has come: on a busy machine the rarer ones take longer.
-    run(test::effort.stress,
-        [&] { return m_started >= wanted && m_refused > 0 && m_checked > 0 && m_deleted > 0; });
+    run(test::effort.stress, [&] { return m_started >= wanted && hasMetAll(); });
     cleanUp();
-    // But for the room that lists keep for more elements: a job takes about 10 KB.
-    EXPECT_LT(test::liveBytes() - before, 1000);
+    // But for what is kept once, as the room of lists for more elements: each job takes about 10 KB.
+    EXPECT_LT(test::liveBytes() - before, 5000);
     EXPECT_EQ(claim(), "");
     // Every job that was started has run, and each flash has ended well.
     EXPECT_EQ(static_cast<std::uint64_t>(JobThread::executionCount - executionsBefore), m_started);

@@ -105,6 +105,18 @@ TEST(DaemonTest, LetsAFlashEndBeforeItStops) {
     }
 }
 
+/// How a client connects that keeps its session in a file: "New, TLSv1.3" or "Reused, TLSv1.2".
+std::string handshake(const RunningDaemon& daemon, const std::string& version, bool resumes) {
+    // The server closes after its answer: by then the client has seen all tickets.
+    const std::string script =
+        "printf 'GET / HTTP/1.1\\r\\nHost: x\\r\\nConnection: close\\r\\n\\r\\n' |"
+        " openssl s_client -ign_eof -connect 127.0.0.1:$0 -$1 $2 $3 -sess_out $3 |"
+        " grep -o -m 1 -E '^(New|Reused), [^,]*'";
+    return test::run({"/bin/sh", "-c", script, std::to_string(daemon.httpsPort()), version,
+                      resumes ? "-sess_in" : "-sess_out", daemon.folder() / version})
+        .out;
+}
+
 TEST(DaemonTest, ReadsUsersAndCertificateAgain) {
     RunningDaemon daemon({}, {"QUENX_LOG=", "TARVEL_SMASHv2_LOG_LEVEL=2"});
     const RunningDaemon other;
@@ -126,6 +138,11 @@ TEST(DaemonTest, ReadsUsersAndCertificateAgain) {
 
     std::filesystem::rename(away, certificate);
     EXPECT_TRUE(isServed("admin", true));
+    for (const bool resumes : {false, true}) {
+        const std::string how = resumes ? "Reused, TLSv1." : "New, TLSv1.";
+        EXPECT_EQ(handshake(daemon, "tls1_2", resumes), how + "2\n");
+        EXPECT_EQ(handshake(daemon, "tls1_3", resumes), how + "3\n");
+    }
     for (const char* file : {"cert.pem", "key.pem"})
         daemon.folder().write(file, test::readTestFile(other.folder() / file));
     EXPECT_FALSE(isServed("admin", true));  // it still shows the old one
@@ -134,6 +151,9 @@ TEST(DaemonTest, ReadsUsersAndCertificateAgain) {
     for (int round = 0; round < 1000 && !isNew; ++round)
         isNew = isServed("admin", true);
     EXPECT_TRUE(isNew);
+    // Whoever trusted the old one has to look at the new one.
+    EXPECT_EQ(handshake(daemon, "tls1_2", true), "New, TLSv1.2\n");
+    EXPECT_EQ(handshake(daemon, "tls1_3", true), "New, TLSv1.3\n");
     const ProgramResult result = daemon.stop();
     EXPECT_EQ(result.status, 0);
     EXPECT_FALSE(contains(result.out, "[debug]")) << "nobody asked for a copy of the log";
@@ -230,7 +250,9 @@ TEST(DaemonTest, AsksPamAndTheGroupsOfTheSystem) {
 
 class DaemonSessionTest : public ::testing::TestWithParam<const char*> {
   protected:
-    const RunningDaemon m_daemon;
+    const std::string m_policy =
+        GetParam() == std::string("ServedHistory") ? "history_served = true\n" : "# As if there were none.\n";
+    const RunningDaemon m_daemon{{}, {}, {}, m_policy};
 };
 
 TEST_P(DaemonSessionTest, ShowsWhatIsWrittenDown) {
@@ -239,7 +261,7 @@ TEST_P(DaemonSessionTest, ShowsWhatIsWrittenDown) {
                         "HTTP" + loopback + std::to_string(m_daemon.httpPort()) + "\nHTTPS" + loopback +
                             std::to_string(m_daemon.httpsPort()) + R"(
         ADMIN=http://admin:admin@$HTTP
-        export QUENXCTL_PASSWORD=admin QUENXCTL_SOCKET=socket
+        export SOURCE=')" QUENX_PACKAGING_DIR R"(/..' QUENXCTL_PASSWORD=admin QUENXCTL_SOCKET=socket
         here() { quenxctl --adapters adapters.toml --config provider.conf --policy policy.toml "$@"; }
         remote() { quenxctl --server https://$HTTPS --user admin --cacert cert.pem "$@"; }
         same() { here "$@" | sort >there; remote "$@" | sort | diff there - && test -s there; }
@@ -248,7 +270,7 @@ TEST_P(DaemonSessionTest, ShowsWhatIsWrittenDown) {
 
 INSTANTIATE_TEST_SUITE_P(Shell, DaemonSessionTest,
                          ::testing::Values("Held", "Interop", "Remote", "RemotePolicy", "SameModel",
-                                           "SecondDaemon", "TwoFronts", "Update"),
+                                           "SecondDaemon", "ServedHistory", "TwoFronts", "Update"),
                          [](const auto& session) { return std::string(session.param); });
 
 }  // namespace

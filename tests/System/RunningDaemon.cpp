@@ -12,14 +12,15 @@
 namespace test {
 
 RunningDaemon::RunningDaemon(const std::vector<std::string>& options,
-                             const std::vector<std::string>& environment, std::vector<std::string> command) {
+                             const std::vector<std::string>& environment, std::vector<std::string> command,
+                             const std::string& policy) {
     m_folder.write("quenx-cimd.toml",
                    "[listen]\nhttps_port = 0\nhttp = true\nhttp_port = 0\n[tls]\ngenerate = "
                    "true\n[auth]\nmethod = 'users'\n");
     setPassword("admin");
     setPassword("guest", "--reader");
     m_folder.write("provider.conf", "");
-    m_folder.write("policy.toml", "# As if there were none.\n");
+    m_folder.write("policy.toml", policy);
     m_folder.write("adapters.toml", kTestAdapters);
     command.push_back(QUENX_CIMD);
     const std::pair<const char*, const char*> files[] = {{"--config", "quenx-cimd.toml"},
@@ -31,6 +32,7 @@ RunningDaemon::RunningDaemon(const std::vector<std::string>& options,
                                                          {"--providers-policy", "policy.toml"},
                                                          {"--adapters-description", "adapters.toml"},
                                                          {"--adapters-state", "state"},
+                                                         {"--uploads-directory", "images"},
                                                          {"--daemon-lock-file", "lock"}};
     for (const auto& [option, file] : files)
         command.insert(command.end(), {option, m_folder / file});

@@ -19,7 +19,8 @@ class RunningDaemon {
     /// @param command  what runs the daemon, for one that does not run by itself
     explicit RunningDaemon(const std::vector<std::string>& options = {},
                            const std::vector<std::string>& environment = {},
-                           std::vector<std::string> command = {});
+                           std::vector<std::string> command = {},
+                           const std::string& policy = "# As if there were none.\n");
 
     int httpPort() const { return m_httpPort; }
     int httpsPort() const { return m_httpsPort; }

@@ -37,8 +37,12 @@ class QUENX_EXPORT AnswerMeter {
     /// one.
     template <class Value>
     static void append(std::vector<Value>& answer, Value value) {
-        if (AnswerMeter* meter = current()) meter->add(bytesOf(value));
+        if (current() != nullptr) tell(bytesOf(value));
         answer.push_back(std::move(value));
+    }
+    /// For what is written down at once: tells the thread's meter if it has one.
+    static void tell(std::size_t bytes) {
+        if (AnswerMeter* meter = current()) meter->add(bytes);
     }
 
   private:

@@ -61,7 +61,8 @@ std::string shownText(const std::exception& error) {
 }
 
 std::string auditLine(const AuditEvent& event, const std::vector<Argument>& arguments) {
-    return "[audit]" + field("user", event.user, kNameLimit) + field("address", event.address, kNameLimit) +
+    return "[audit]" + field("user", event.caller.principal, kNameLimit) +
+           field("address", event.caller.address, kNameLimit) +
            field("operation", event.operation, kNameLimit) + field("target", event.target, kTextLimit) +
            " arguments=\"" + argumentsText(arguments) + '"' + field("outcome", event.outcome, kTextLimit);
 }

@@ -5,6 +5,7 @@
 #include <string>
 #include <vector>
 
+#include "Framework/Requests/Caller.h"
 #include "Framework/Requests/CimOperations.h"
 
 /// The audit trail: one line in the system log for each attempt to change something and for each refusal. A
@@ -13,8 +14,7 @@ namespace core {
 
 /// Who asked for what, and how it ended. Any of the texts may come from a client.
 struct AuditEvent {
-    std::string user;
-    std::string address;    ///< the client's; "local" for a program of this machine
+    Caller caller;
     std::string operation;  ///< "DeleteInstance", "InstallFromURI", "login"
     std::string target;     ///< the path of the object; may be empty
     std::string outcome;    ///< see outcomeOf(); "done", "denied: ...", "failed: ..."

@@ -131,7 +131,15 @@ std::optional<CimValue> typedValue(const ParameterDeclaration& declared, const A
 
 }  // namespace
 
+InstanceSink::~InstanceSink() = default;
+
 CimOperations::~CimOperations() = default;
+
+void CimOperations::streamInstances(const std::string& className, const PropertyFilter& filter,
+                                    InstanceSink& sink) {
+    for (const InstanceValue& instance : enumerateInstances(className, filter))
+        AnswerMeter::tell(sink.take(instance));
+}
 
 const PropertyValue* InstanceValue::find(std::string_view name) const {
     return findByName(properties, name);
@@ -157,18 +165,33 @@ bool WantedProperties::includes(std::string_view name) const {
     return !m_names || std::binary_search(m_names->begin(), m_names->end(), name, isFoldedBefore);
 }
 
-InstanceValue readInstance(CimInstance& instance, CimPath path, const WantedProperties& wanted,
+const WantedProperties::Choice& WantedProperties::among(const CimInstance& instance)
+    QUENX_NO_THREAD_SAFETY_ANALYSIS {
+    const auto [entry, isNew] = m_choices.try_emplace(&instance.shape());
+    Choice& choice = entry->second;
+    if (!isNew) return choice;
+    const std::vector<CimProperty*>& all = instance.getAllProperties();
+    auto place = all.begin();
+    for (CimProperty* property : instance.getProperties()) {
+        place = std::find(place, all.end(), property);
+        const bool isWanted = includes(property->getName());
+        if (isWanted) choice.properties.push_back(static_cast<std::size_t>(place - all.begin()));
+        if ((isWanted || property->isKey()) && property->getType() == CimType::Reference)
+            choice.hasReferences = true;
+    }
+    return choice;
+}
+
+InstanceValue readInstance(CimInstance& instance, CimPath path, WantedProperties& wanted,
                            const std::string& namespaceName) {
     InstanceValue result{std::move(path), {}};
     result.path.completeNamespace(namespaceName);
     // One lock around all properties: a refresh on another thread shows whole or not at all.
     const RecursiveLocker lock(instance.getMutex());
-    const std::vector<CimProperty*> properties = instance.getProperties();
-    result.properties.reserve(properties.size());
-    for (const CimProperty* property : properties) {
-        if (wanted.includes(property->getName()))
-            result.properties.push_back(readProperty(*property, namespaceName));
-    }
+    const std::vector<std::size_t>& chosen = wanted.among(instance).properties;
+    result.properties.reserve(chosen.size());
+    for (const std::size_t index : chosen)
+        result.properties.push_back(readProperty(*instance.getAllProperties()[index], namespaceName));
     return result;
 }
 

@@ -3,6 +3,7 @@
 
 #include <cstdint>
 #include <functional>
+#include <map>
 #include <optional>
 #include <string>
 #include <string_view>
@@ -49,21 +50,50 @@ struct QUENX_EXPORT InstanceValue {
 /// ignored).
 using PropertyFilter = std::optional<std::vector<std::string>>;
 
-/// A filter made ready for one request: a client may send thousands of names, and every property of every
-/// instance is looked up among them. The filter must outlive it.
+/// A filter made ready for one request: a client may send thousands of names, and every property is looked up
+/// among them, once for all instances of one shape. The filter must outlive it. Used by one thread.
 class QUENX_EXPORT WantedProperties {
   public:
     explicit WantedProperties(const PropertyFilter& filter);
     bool includes(std::string_view name) const;
 
+    struct Choice {
+        std::vector<std::size_t> properties;  ///< which of all; those that are served, in their order
+        bool hasReferences = false;           ///< among them, or among the keys
+    };
+    /// To be called under the instance's lock. The choice lives as long as this.
+    const Choice& among(const CimInstance& instance);
+
   private:
     /// Sorted and not hashed: whoever sends the names could choose some that collide.
     std::optional<std::vector<std::string_view>> m_names;
+    /// By shape; an answer has instances of a few.
+    std::map<const void*, Choice> m_choices;
 };
 
 /// A copy of the instance, under its lock; paths in it are completed with the namespace.
-InstanceValue readInstance(CimInstance& instance, CimPath path, const WantedProperties& wanted,
+InstanceValue readInstance(CimInstance& instance, CimPath path, WantedProperties& wanted,
                            const std::string& namespaceName);
+
+/// An instance where it is, its lock held: the properties that are wanted, none of them a reference.
+struct InstanceCells {
+    const CimInstance& instance;
+    const std::vector<std::size_t>& wanted;  ///< which of all its properties; the same object for its shape
+};
+
+/// Takes the instances of an answer, and writes them down at once.
+class QUENX_EXPORT InstanceSink {
+  public:
+    InstanceSink() = default;
+    InstanceSink(const InstanceSink&) = delete;
+    InstanceSink& operator=(const InstanceSink&) = delete;
+    virtual ~InstanceSink();
+
+    /// Both return how many bytes more the answer takes. The first is called under the instance's lock, and
+    /// so must not wait for anything, nor call back.
+    virtual std::size_t take(const InstanceCells& instance) = 0;
+    virtual std::size_t take(const InstanceValue& instance) = 0;
+};
 
 /// What narrows a walk over associations (DSP0200 5.4.2.8 to 5.4.2.11). An empty text narrows nothing.
 struct AssociationFilter {
@@ -107,6 +137,10 @@ class QUENX_EXPORT CimOperations {
     virtual std::vector<InstanceValue> enumerateInstances(const std::string& className,
                                                           const PropertyFilter& filter = std::nullopt) = 0;
     virtual std::vector<CimPath> enumerateInstanceNames(const std::string& className) = 0;
+    /// The same, one by one. What the sink throws ends the enumeration. Keeps no more than one of them as a
+    /// value, where the implementation can do without.
+    virtual void streamInstances(const std::string& className, const PropertyFilter& filter,
+                                 InstanceSink& sink);
     /// InvalidClass for an unknown class, InvalidParameter for keys that are not those of the class, NotFound
     /// when no instance has them.
     virtual InstanceValue getInstance(const CimPath& path, const PropertyFilter& filter = std::nullopt) = 0;

@@ -5,7 +5,7 @@
 #include <algorithm>
 #include <functional>
 #include <map>
-#include <set>
+#include <unordered_map>
 
 #include "Framework/Classes/InstanceList.h"
 #include "Framework/Model/CimInstance.h"
@@ -19,16 +19,48 @@ namespace core {
 
 namespace {
 
-/// Calls the visitor once per path: two agents may serve the same instance, or one class list it twice.
+/// The instances of an answer, told apart by their paths: two agents may serve the same one, or one class
+/// list it twice.
+class SeenInstances {
+  public:
+    /// False for one that was there already.
+    bool insert(const CimInstance& instance) {
+        const std::size_t hash = instance.hashOfKeys();
+        const auto [first, last] = m_seen.equal_range(hash);
+        // Texts are compared nearly never, since few others share a hash.
+        const bool isKnown = std::any_of(
+            first, last, [&](const auto& other) { return textOf(*other.second) == textOf(instance); });
+        if (isKnown) return false;
+        m_seen.emplace(hash, &instance);
+        return true;
+    }
+
+  private:
+    static std::string textOf(const CimInstance& instance) { return CimPath::of(instance).toString(); }
+
+    std::unordered_multimap<std::size_t, const CimInstance*> m_seen;
+};
+
+/// Calls the visitor once per path.
 void visitInstances(const ServedClasses& classes, const std::string& className,
-                    const std::function<void(CimInstance&, CimPath)>& visit) {
-    std::set<std::string> seen;
+                    const std::function<void(CimInstance&)>& visit) {
+    SeenInstances seen;
     for (const ServedClass* each : classes.derivedFrom(className)) {
         for (CimInstance* instance : InstanceRange(each->object->getInstances())) {
-            CimPath path = CimPath::of(*instance);
-            if (seen.insert(path.toString()).second) visit(*instance, std::move(path));
+            if (seen.insert(*instance)) visit(*instance);
         }
     }
+}
+
+/// Hands the instance over as it is, or as a value where paths have to be completed with the namespace.
+std::size_t handOver(CimInstance& instance, WantedProperties& wanted, const std::string& namespaceName,
+                     InstanceSink& sink) {
+    {
+        const RecursiveLocker lock(instance.getMutex());
+        const WantedProperties::Choice& choice = wanted.among(instance);
+        if (!choice.hasReferences) return sink.take(InstanceCells{instance, choice.properties});
+    }
+    return sink.take(readInstance(instance, CimPath::of(instance), wanted, namespaceName));
 }
 
 /// The output parameter under which an instance handed back by a method is served.
@@ -101,19 +133,30 @@ CimRequests::CimRequests(std::string namespaceName) : m_namespace(std::move(name
 std::vector<InstanceValue> CimRequests::enumerateInstances(const std::string& className,
                                                            const PropertyFilter& filter) {
     return answerRequest(m_namespace, [&](const ServedClasses& classes) {
-        const WantedProperties wanted(filter);
+        WantedProperties wanted(filter);
         std::vector<InstanceValue> result;
-        visitInstances(classes, className, [&](CimInstance& instance, CimPath path) {
-            AnswerMeter::append(result, readInstance(instance, std::move(path), wanted, m_namespace));
+        visitInstances(classes, className, [&](CimInstance& instance) {
+            AnswerMeter::append(result, readInstance(instance, CimPath::of(instance), wanted, m_namespace));
         });
         return result;
+    });
+}
+
+void CimRequests::streamInstances(const std::string& className, const PropertyFilter& filter,
+                                  InstanceSink& sink) {
+    answerRequest(m_namespace, [&](const ServedClasses& classes) {
+        WantedProperties wanted(filter);
+        visitInstances(classes, className, [&](CimInstance& instance) {
+            AnswerMeter::tell(handOver(instance, wanted, m_namespace, sink));
+        });
     });
 }
 
 std::vector<CimPath> CimRequests::enumerateInstanceNames(const std::string& className) {
     return answerRequest(m_namespace, [&](const ServedClasses& classes) {
         std::vector<CimPath> result;
-        visitInstances(classes, className, [&](CimInstance&, CimPath path) {
+        visitInstances(classes, className, [&](CimInstance& instance) {
+            CimPath path = CimPath::of(instance);
             path.completeNamespace(m_namespace);
             AnswerMeter::append(result, std::move(path));
         });
@@ -126,7 +169,8 @@ InstanceValue CimRequests::getInstance(const CimPath& path, const PropertyFilter
         CimPath typed = classes.typed(path);
         CimInstance& instance = classes.requireInstance(typed);
         // Its own path: a client may have spelled names in another case.
-        return readInstance(instance, CimPath::of(instance), WantedProperties(filter), m_namespace);
+        WantedProperties wanted(filter);
+        return readInstance(instance, CimPath::of(instance), wanted, m_namespace);
     });
 }
 

@@ -18,6 +18,8 @@ class QUENX_EXPORT CimRequests : public CimOperations {
 
     std::vector<InstanceValue> enumerateInstances(const std::string& className,
                                                   const PropertyFilter& filter = std::nullopt) override;
+    void streamInstances(const std::string& className, const PropertyFilter& filter,
+                         InstanceSink& sink) override;
     std::vector<CimPath> enumerateInstanceNames(const std::string& className) override;
     InstanceValue getInstance(const CimPath& path, const PropertyFilter& filter = std::nullopt) override;
 

@@ -88,12 +88,19 @@ std::vector<CimPath> farEnds(const ServedClasses& classes, const CimPath& path, 
     return result;
 }
 
-/// Finds many instances by their paths, and enumerates each class once for all of them. The request scope
-/// holds what it finds.
+/// Finds instances by their paths: one alone by its keys, many by enumerating their class once for all of
+/// them. The request scope holds what it finds.
 class InstanceFinder {
   public:
+    explicit InstanceFinder(const std::vector<CimPath>& paths) {
+        for (const CimPath& path : paths)
+            ++m_wanted[foldName(path.getClassName())];
+    }
+
     CimInstance* find(CimPath& path) {
-        const auto [entry, isNew] = m_classes.try_emplace(foldName(path.getClassName()));
+        const std::string className = foldName(path.getClassName());
+        if (m_wanted[className] == 1) return GetCimBroker()->getInstanceByPath(path);
+        const auto [entry, isNew] = m_classes.try_emplace(className);
         if (isNew) enumerate(path.getClassName(), entry->second);
         const auto found = entry->second.find(path.toString());
         // A path may be spelled otherwise than its instance spells it.
@@ -109,6 +116,7 @@ class InstanceFinder {
         }
     }
 
+    std::map<std::string, std::size_t> m_wanted;
     std::map<std::string, Instances> m_classes;
 };
 
@@ -130,10 +138,11 @@ void visitAssociations(const ServedClasses& classes, const CimPath& path, const 
 std::vector<InstanceValue> CimRequests::associators(const CimPath& path, const AssociationFilter& by,
                                                     const PropertyFilter& filter) {
     return answerRequest(m_namespace, [&](const ServedClasses& classes) {
-        const WantedProperties wanted(filter);
+        WantedProperties wanted(filter);
         std::vector<InstanceValue> result;
-        InstanceFinder finder;
-        for (CimPath& far : farEnds(classes, path, by)) {
+        std::vector<CimPath> ends = farEnds(classes, path, by);
+        InstanceFinder finder(ends);
+        for (CimPath& far : ends) {
             if (CimInstance* instance = finder.find(far)) {
                 AnswerMeter::append(result, readInstance(*instance, std::move(far), wanted, m_namespace));
             }
@@ -154,7 +163,7 @@ std::vector<CimPath> CimRequests::associatorNames(const CimPath& path, const Ass
 std::vector<InstanceValue> CimRequests::references(const CimPath& path, const AssociationFilter& by,
                                                    const PropertyFilter& filter) {
     return answerRequest(m_namespace, [&](const ServedClasses& classes) {
-        const WantedProperties wanted(filter);
+        WantedProperties wanted(filter);
         std::vector<InstanceValue> result;
         visitAssociations(classes, path, by, [&](CimInstance& association, CimPath own) {
             AnswerMeter::append(result, readInstance(association, std::move(own), wanted, m_namespace));

@@ -2,6 +2,7 @@
 #include "Framework/Requests/PolicyDecision.h"
 
 #include <algorithm>
+#include <string>
 
 #include "Framework/Model/CimError.h"
 #include "Utils/Os/Linux/PolicyFile.h"
@@ -11,8 +12,7 @@ namespace core {
 
 namespace {
 
-thread_local const CallerScope* currentScope = nullptr;
-thread_local bool isDecided = false;
+thread_local const PolicyDecision* outermost = nullptr;
 
 [[noreturn]] void refuse(const std::string& text) {
     throw CimError(CimStatus::AccessDenied, text);
@@ -45,28 +45,21 @@ void requireAdministrator(const utils::Policy& policy, const Caller& caller) {
 
 }  // namespace
 
-CallerScope::CallerScope(Caller caller) : m_caller(std::move(caller)), m_outer(currentScope) {
-    currentScope = this;
-}
-
-CallerScope::~CallerScope() {
-    currentScope = m_outer;
-}
-
-const Caller& CallerScope::current() {
-    static const Caller nobody;
-    return currentScope == nullptr ? nobody : currentScope->m_caller;
-}
-
-PolicyDecision::PolicyDecision() : m_isOutermost(!isDecided) {
+PolicyDecision::PolicyDecision() : m_isOutermost(outermost == nullptr) {
     if (!m_isOutermost) return;
     m_policy = readPolicy();
     if (m_policy != nullptr) requireAdministrator(*m_policy, CallerScope::current());
-    isDecided = true;
+    outermost = this;
 }
 
 PolicyDecision::~PolicyDecision() {
-    if (m_isOutermost) isDecided = false;
+    if (m_isOutermost) outermost = nullptr;
+}
+
+const utils::Policy& PolicyDecision::policy() {
+    static const utils::Policy unrestricted;
+    const bool isRead = outermost != nullptr && outermost->m_policy != nullptr;
+    return isRead ? *outermost->m_policy : unrestricted;
 }
 
 }  // namespace core

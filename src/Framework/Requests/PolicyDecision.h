@@ -2,35 +2,13 @@
 #pragma once
 
 #include <memory>
-#include <string>
 #include <string_view>
 
+#include "Framework/Requests/Caller.h"
 #include "Utils/Export.h"
 #include "Utils/Policy.h"
 
 namespace core {
-
-/// Who asks, as a front knows it.
-struct Caller {
-    std::string principal;  ///< the user's name; empty where nobody said one
-    bool isFront = false;   ///< the front itself, which does what its own settings say
-};
-
-/// Says who asks on the calling thread for the length of a scope. Without one the caller has no name.
-class QUENX_EXPORT CallerScope {
-  public:
-    explicit CallerScope(Caller caller);
-    CallerScope(const CallerScope&) = delete;
-    CallerScope& operator=(const CallerScope&) = delete;
-    ~CallerScope();
-
-    /// The calling thread's.
-    static const Caller& current();
-
-  private:
-    const Caller m_caller;
-    const CallerScope* const m_outer;
-};
 
 /// The beginning of a refusal by a policy that cannot be obeyed.
 inline constexpr std::string_view kBadPolicy = "nothing can be installed or deleted";
@@ -49,6 +27,10 @@ class QUENX_EXPORT PolicyDecision {
     PolicyDecision(const PolicyDecision&) = delete;
     PolicyDecision& operator=(const PolicyDecision&) = delete;
     ~PolicyDecision();
+
+    /// The snapshot by which the calling thread's call is decided. Where there is none, one that restricts
+    /// nothing. Good until the outermost decision ends.
+    static const utils::Policy& policy();
 
   private:
     const bool m_isOutermost;

@@ -5,6 +5,7 @@
 
 #include <algorithm>
 #include <filesystem>
+#include <utility>
 
 #include "Framework/Requests/CimRequests.h"
 #include "Utils/Build.h"
@@ -72,6 +73,18 @@ void ProviderLibraries::load(const std::string& directory) {
         m_handles.push_back(std::move(handle));
         m_loaded.push_back(file.string());
     }
+}
+
+std::string ProviderSession::loadHistory() {
+    const std::string path = ProviderLibraries::defaultDirectory() + "/history/libQuenx_History.so";
+    // Never unloaded: where a disk hangs, the history's thread is in it when everybody else has left.
+    void* const library = dlopen(path.c_str(), RTLD_NOW | RTLD_LOCAL | RTLD_NODELETE);
+    if (library == nullptr) return path + ": " + loaderReason(path);
+    using Open = void (*)(ProviderSession&);
+    const auto open = reinterpret_cast<Open>(dlsym(library, "quenx_openHistory"));
+    if (open == nullptr) return path + ": " + loaderReason(path);
+    open(*this);
+    return "";
 }
 
 ProviderSession::ProviderSession(const std::string& configurationFile, const std::string& policyFile)

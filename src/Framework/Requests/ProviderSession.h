@@ -7,6 +7,7 @@
 #include <vector>
 
 #include "Framework/Requests/CimOperations.h"
+#include "Framework/Requests/UpdateSink.h"
 #include "Utils/Os/Linux/LinuxOSLocker.h"
 #include "Utils/Os/Linux/PolicyFile.h"
 #include "Utils/Os/Linux/SMASHv2Config.h"
@@ -67,6 +68,18 @@ class QUENX_EXPORT ProviderSession {
     ProviderSession(const ProviderSession&) = delete;
     ProviderSession& operator=(const ProviderSession&) = delete;
 
+    /// Has the providers tell this sink of updates. To be called before they are loaded, once; without it
+    /// they tell nobody.
+    void keepHistory(std::shared_ptr<UpdateSink> sink) { m_history.emplace(std::move(sink)); }
+
+    /// The same with the sink of the library for this, history/libQuenx_History.so in the default directory,
+    /// for fronts that cannot link it. Returns why it cannot be loaded; empty when it was.
+    std::string loadHistory();
+
+    /// Keeps an agent beside those of the libraries. To be called once at most.
+    /// @param agent  ends it when given up
+    void serve(std::shared_ptr<void> agent) { m_agent = std::move(agent); }
+
     /// Loads the providers of a directory, see ProviderLibraries::load().
     ProviderLibraries& libraries() { return m_libraries; }
 
@@ -82,7 +95,9 @@ class QUENX_EXPORT ProviderSession {
     std::optional<utils::SMASHv2Config> m_configuration;
     utils::PolicyFile m_policy;
     os::OSLockerLinux m_locker;
+    std::optional<InstalledSink> m_history;
     ProviderLibraries m_libraries;
+    std::shared_ptr<void> m_agent;
     std::shared_ptr<CimOperations> m_operations;
 };
 

@@ -86,10 +86,14 @@ AuthenticationResult Authentication::authenticate(const std::optional<std::strin
     const auto& user = checked->user;
     if (user && user->mayRead) return {AuthenticationOutcome::Accepted, *user};
     if (user) {
-        m_trail->refused({credentials->user, address, "login", "", "denied: not admitted"}, {});
+        m_trail->refused(
+            {{.principal = credentials->user, .address = address}, "login", "", "denied: not admitted"}, {});
         return {AuthenticationOutcome::Forbidden, *user};
     }
-    core::audit({credentials->user, address, "login", "", "denied: wrong user or password"});
+    core::audit({{.principal = credentials->user, .address = address},
+                 "login",
+                 "",
+                 "denied: wrong user or password"});
     waitUntil(checked->mayBeTold, ended);
     return {AuthenticationOutcome::Wrong, {}};
 }

@@ -32,7 +32,8 @@ struct GivenOption {
 /// mistakes are told in ours.
 void addOptions(CLI::App& app, std::vector<GivenOption>& given) {
     for (GivenOption& each : given) {
-        const std::string help = each.field.help + " [" + each.field.text() + "]";
+        const std::string range = each.field.isNumber() ? "; " + each.field.range() : "";
+        const std::string help = each.field.help + " [" + each.field.text() + range + "]";
         CLI::Option* option = app.add_option(each.field.option(), each.texts, help);
         option->group("Settings (" + each.field.key.substr(0, each.field.key.find('.')) + ".* in the file)");
         // "--listen-http" alone turns it on; "--listen-https=false" needs the equals sign.

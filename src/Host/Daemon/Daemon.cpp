@@ -9,6 +9,7 @@
 
 #include "Framework/Classes/CimBroker.h"
 #include "Framework/Classes/InstanceList.h"
+#include "History/Log/LogAgent.h"
 #include "Host/Daemon/Report.h"
 #include "Host/Operations/Dispatcher.h"
 #include "Host/Operations/InteropNamespace.h"
@@ -110,6 +111,7 @@ ma::BackendChoice adaptersOf(const Settings& settings) {
 Daemon::Daemon(const Settings& settings)
     : m_settings(settings),
       m_lock(settings.lockFile),
+      m_history(history::History::wanted()),
       m_session(settings.providerConfiguration, settings.policy) {
     m_lock.require();
     reportPolicy();
@@ -117,11 +119,17 @@ Daemon::Daemon(const Settings& settings)
         reportProblem("Warning: " + text);
     // Before the providers come, which ask for the adapters as soon as they are called.
     selectAdapters(m_settings);
+    m_session.keepHistory(m_history);
+    // Whoever died in an update cannot tell any more how it ended.
+    if (m_history) m_history->look();
     loadProviders(m_session.libraries(), m_settings.providers);
+    history::serveLog(m_session, m_history);
+    openSpool();
     m_retention.emplace(m_settings.jobs, m_session.operations());
     m_dispatcher = makeDispatcher();
     m_authentication = makeAuthentication();
-    m_server = std::make_unique<HttpServer>(m_settings.limits, *m_dispatcher, *m_authentication);
+    m_control.emplace(m_session.operations(), m_trail, *m_spool);
+    m_server = std::make_unique<HttpServer>(m_settings.limits, *m_dispatcher, *m_authentication, &*m_control);
     // Last, so that whoever can connect is also answered.
     listen();
 }
@@ -153,6 +161,18 @@ std::unique_ptr<Authentication> Daemon::makeAuthentication() const {
         checker = std::make_unique<PamChecker>(settings.readers);
     }
     return std::make_unique<Authentication>(std::move(checker), settings.rememberFor, LoginPace(), m_trail);
+}
+
+void Daemon::openSpool() {
+    try {
+        m_spool.emplace(m_settings.uploads);
+    } catch (const std::exception& error) {
+        // Another user's, most likely. All else can go on without.
+        reportProblem(std::string("Warning: No images are taken: ") + error.what() +
+                      ". Set uploads.directory to a folder of this program's own, or to \"\".");
+        m_spool.emplace(UploadSettings{.directory = ""});
+    }
+    utils::SMASHv2Config::getInstance()->setUploadDirectory(m_spool->folder());
 }
 
 void Daemon::listenOn(std::uint16_t port, bool tls) {

@@ -8,6 +8,8 @@
 #include <vector>
 
 #include "Framework/Requests/ProviderSession.h"
+#include "History/History.h"
+#include "Host/Control/Control.h"
 #include "Host/Daemon/JobRetention.h"
 #include "Host/Server/HttpServer.h"
 #include "Host/Settings.h"
@@ -77,6 +79,7 @@ class Daemon {
   private:
     std::unique_ptr<Dispatcher> makeDispatcher() const;
     std::unique_ptr<Authentication> makeAuthentication() const;
+    void openSpool();
     void readCertificate();
     /// A bad policy stops no reader; the session logs it.
     void reportPolicy();
@@ -87,11 +90,14 @@ class Daemon {
     const LockFile m_lock;
     std::string m_addresses;
     // Destroyed last to first: the server lets go of its requests before the providers leave.
+    const std::shared_ptr<history::History> m_history;  ///< null where none is wanted
     core::ProviderSession m_session;
     std::optional<JobRetention> m_retention;
     const std::shared_ptr<AuditTrail> m_trail = std::make_shared<AuditTrail>();
     std::unique_ptr<Dispatcher> m_dispatcher;
     std::unique_ptr<Authentication> m_authentication;
+    std::optional<Spool> m_spool;
+    std::optional<Control> m_control;
     std::unique_ptr<HttpServer> m_server;
 };
 

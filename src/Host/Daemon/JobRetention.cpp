@@ -4,7 +4,7 @@
 #include <algorithm>
 
 #include "Framework/Requests/Audit.h"
-#include "Framework/Requests/PolicyDecision.h"
+#include "Framework/Requests/Caller.h"
 #include "Host/Repetition.h"
 #include "Providers/Schema/ValueMaps.h"
 
@@ -62,7 +62,9 @@ JobRetention::JobRetention(const JobSettings& settings, std::shared_ptr<core::Ci
 }
 
 void JobRetention::sweep() {
-    const core::CallerScope scope({.principal = "quenx-cimd", .isFront = true});
+    const core::Caller itself{
+        .principal = "quenx-cimd", .address = "local", .front = "quenx-cimd", .isFront = true};
+    const core::CallerScope scope(itself);
     const auto jobs = m_operations->enumerateInstances(kJobClass, {{"JobState"}});
     for (const auto& [path, setting] : m_jobs.look(jobs, EndedJobs::Clock::now())) {
         std::string outcome = "done";
@@ -76,7 +78,7 @@ void JobRetention::sweep() {
             outcome = core::outcomeOf(error.status(), error.what());
         }
         const auto rule = core::CimValue::of(core::CimType::String, setting);
-        core::audit({"quenx-cimd", "local", "DeleteInstance", path.toString(), outcome}, {{"rule", rule}});
+        core::audit({itself, "DeleteInstance", path.toString(), outcome}, {{"rule", rule}});
     }
 }
 

@@ -27,10 +27,8 @@ Overloaded(Cases...) -> Overloaded<Cases...>;
 
 std::uint64_t numberIn(const SettingsField& field, const std::string& text) {
     const auto number = utils::parseNumber<std::uint64_t>(text);
-    if (!number || *number < field.least || *number > field.most) {
-        refuse(field, text,
-               "a number from " + std::to_string(field.least) + " to " + std::to_string(field.most));
-    }
+    if (!number || *number < field.least || *number > field.most)
+        refuse(field, text, "a number from " + field.range());
     return *number;
 }
 
@@ -40,6 +38,10 @@ bool flagIn(const SettingsField& field, const std::string& text) {
 }
 
 }  // namespace
+
+std::string SettingsField::range() const {
+    return std::to_string(least) + " to " + std::to_string(most);
+}
 
 std::string SettingsField::option() const {
     std::string name = "--" + key;
@@ -79,73 +81,79 @@ namespace {
 // The texts are what `quenx-cimd --help` prints. The bounds keep one zero too many from using up the memory,
 // and one too few from refusing every client.
 std::vector<SettingsField> limitFields(Settings& s) {
-    return {{"limits.body_bytes", &s.limits.bodyBytes, 1024, kGibibyte, "largest request body"},
-            {"limits.anonymous_body_bytes", &s.limits.anonymousBodyBytes, 0, kGibibyte,
-             "how much is read of a request that is refused"},
-            {"limits.header_bytes", &s.limits.headerBytes, 4096, 1U << 20, "largest request headers"},
-            {"limits.connections", &s.limits.connections, 1, 4096,
-             "most connections at a time; each has a thread"},
-            {"limits.connections_per_address", &s.limits.connectionsPerAddress, 1, 4096,
-             "most connections from one address"},
-            {"limits.workers", &s.limits.workers, 1, 4096, "most requests carried out at a time"},
-            {"limits.requests_per_user", &s.limits.requestsPerUser, 1, 4096,
-             "most requests of one user carried out at a time; further ones wait"},
-            {"limits.answer_bytes", &s.limits.answerBytes, 1U << 20, kGibibyte * 64,
-             "most memory for large answers that clients have not read yet"},
-            {"limits.header_seconds", &s.limits.headerTime, 1, kDay, "time for the headers to arrive"},
-            {"limits.request_seconds", &s.limits.requestTime, 1, kDay,
-             "time for a body to arrive, and for the client to take the answer"},
-            {"limits.idle_seconds", &s.limits.idleTime, 1, kDay, "time between two requests on a connection"},
-            {"limits.enumerations", &s.pulls.open, 1, 100000, "most open pull enumerations"},
-            {"limits.enumerations_per_user", &s.pulls.openPerUser, 1, 100000,
-             "most open pull enumerations of one user"},
-            {"limits.enumeration_seconds", &s.pulls.timeout, 1, kDay,
-             "time between two pulls, unless the client asks for another"},
-            {"limits.enumeration_most_seconds", &s.pulls.maxTimeout, 1, kDay,
-             "longest time between two pulls that a client may ask for"}};
+    return {{"limits.body_bytes", &s.limits.bodyBytes, "largest request body", 1024, kGibibyte},
+            {"limits.anonymous_body_bytes", &s.limits.anonymousBodyBytes,
+             "how much is read of a request that is refused", 0, kGibibyte},
+            {"limits.header_bytes", &s.limits.headerBytes, "largest request headers", 4096, 1U << 20},
+            {"limits.connections", &s.limits.connections, "most connections at a time; each has a thread", 1,
+             4096},
+            {"limits.connections_per_address", &s.limits.connectionsPerAddress,
+             "most connections from one address", 1, 4096},
+            {"limits.workers", &s.limits.workers, "most requests carried out at a time", 1, 4096},
+            {"limits.requests_per_user", &s.limits.requestsPerUser,
+             "most requests of one user carried out at a time; further ones wait", 1, 4096},
+            {"limits.answer_bytes", &s.limits.answerBytes,
+             "most memory for large answers that clients have not read yet", 1U << 20, kGibibyte * 64},
+            {"limits.header_seconds", &s.limits.headerTime, "time for the headers to arrive", 1, kDay},
+            {"limits.request_seconds", &s.limits.requestTime,
+             "time for a body to arrive, and for the client to take the answer", 1, kDay},
+            {"limits.idle_seconds", &s.limits.idleTime, "time between two requests on a connection", 1, kDay},
+            {"limits.enumerations", &s.pulls.open, "most open pull enumerations", 1, 100000},
+            {"limits.enumerations_per_user", &s.pulls.openPerUser, "most open pull enumerations of one user",
+             1, 100000},
+            {"limits.enumeration_seconds", &s.pulls.timeout,
+             "time between two pulls, unless the client asks for another", 1, kDay},
+            {"limits.enumeration_most_seconds", &s.pulls.maxTimeout,
+             "longest time between two pulls that a client may ask for", 1, kDay}};
 }
 
 std::vector<SettingsField> otherFields(Settings& s) {
-    return {{"jobs.keep", &s.jobs.keep, 0, 1000000,
-             "how many jobs that have ended are kept; 0 for all, until a client deletes them"},
-            {"jobs.keep_seconds", &s.jobs.keepFor, 0, kDay * 366,
-             "how many seconds a job is kept after its end; 0 for ever"},
-            {"providers.directory", &s.providers, 0, 0, "directory of the provider libraries"},
-            {"providers.configuration", &s.providerConfiguration, 0, 0,
-             "the providers' own configuration file, instead of /etc/quenx-cimprovider.conf"},
-            {"providers.policy", &s.policy, 0, 0,
-             "file that says who may install and delete, instead of /etc/quenx/policy.toml"},
-            {"adapters.backend", &s.backend, 1, 0,
-             "which adapters: devlink for this machine's own, simulator or auto; instead of QUENX_BACKEND"},
-            {"adapters.description", &s.adapters, 1, 0,
-             "file that describes simulated adapters, instead of /etc/quenx-adapters.toml"},
-            {"adapters.state", &s.adapterState, 1, 0,
-             "directory in which they keep their flash, instead of /var/lib/quenx/adapters"},
-            {"daemon.lock_file", &s.lockFile, 0, 0, "file that is locked while quenx-cimd runs"}};
+    return {
+        {"jobs.keep", &s.jobs.keep,
+         "how many jobs that have ended are kept; 0 for all, until a client deletes them", 0, 1000000},
+        {"jobs.keep_seconds", &s.jobs.keepFor, "how many seconds a job is kept after its end; 0 for ever", 0,
+         kDay * 366},
+        {"uploads.directory", &s.uploads.directory,
+         "directory for images that administrators send; empty to take none"},
+        {"uploads.image_bytes", &s.uploads.imageBytes, "largest image that is sent", 1024, 2 * kGibibyte - 1},
+        {"uploads.total_bytes", &s.uploads.totalBytes,
+         "most for all images that were sent; beyond it the oldest are removed", 1024, kGibibyte * 1024},
+        {"providers.directory", &s.providers, "directory of the provider libraries"},
+        {"providers.configuration", &s.providerConfiguration,
+         "the providers' own configuration file, instead of /etc/quenx-cimprovider.conf"},
+        {"providers.policy", &s.policy,
+         "file that says who may install and delete, instead of /etc/quenx/policy.toml"},
+        {"adapters.backend", &s.backend,
+         "which adapters: devlink for this machine's own, simulator or auto; instead of QUENX_BACKEND", 1},
+        {"adapters.description", &s.adapters,
+         "file that describes simulated adapters, instead of /etc/quenx-adapters.toml", 1},
+        {"adapters.state", &s.adapterState,
+         "directory in which they keep their flash, instead of /var/lib/quenx/adapters", 1},
+        {"daemon.lock_file", &s.lockFile, "file that is locked while quenx-cimd runs"}};
 }
 
 }  // namespace
 
 std::vector<SettingsField> fieldsOf(Settings& s) {
     std::vector<SettingsField> fields{
-        {"listen.address", &s.listen.address, 0, 0, "address to listen on"},
-        {"listen.https", &s.listen.https, 0, 0, "serve HTTPS"},
-        {"listen.https_port", &s.listen.httpsPort, 0, 65535, "port for HTTPS; 0 picks a free one"},
-        {"listen.http", &s.listen.http, 0, 0, "serve plain HTTP too; it sends passwords in clear text"},
-        {"listen.http_port", &s.listen.httpPort, 0, 65535, "port for plain HTTP; 0 picks a free one"},
-        {"listen.socket", &s.listen.socket, 0, 0,
+        {"listen.address", &s.listen.address, "address to listen on"},
+        {"listen.https", &s.listen.https, "serve HTTPS"},
+        {"listen.https_port", &s.listen.httpsPort, "port for HTTPS; 0 picks a free one", 0, 65535},
+        {"listen.http", &s.listen.http, "serve plain HTTP too; it sends passwords in clear text"},
+        {"listen.http_port", &s.listen.httpPort, "port for plain HTTP; 0 picks a free one", 0, 65535},
+        {"listen.socket", &s.listen.socket,
          "Unix socket on which root of this machine is served without a password; empty for none"},
-        {"tls.certificate", &s.tls.certificate, 0, 0, "file with the certificate chain (PEM)"},
-        {"tls.key", &s.tls.key, 0, 0, "file with the private key (PEM)"},
-        {"tls.generate", &s.tls.generate, 0, 0,
+        {"tls.certificate", &s.tls.certificate, "file with the certificate chain (PEM)"},
+        {"tls.key", &s.tls.key, "file with the private key (PEM)"},
+        {"tls.generate", &s.tls.generate,
          "make a missing certificate and key, self-signed; those at the default paths are always made"},
-        {"auth.method", &s.authentication.method, 0, 0, "how passwords are checked: pam or users"},
-        {"auth.users_file", &s.authentication.usersFile, 0, 0,
+        {"auth.method", &s.authentication.method, "how passwords are checked: pam or users"},
+        {"auth.users_file", &s.authentication.usersFile,
          "file with users and password hashes, for method users"},
-        {"auth.readers", &s.authentication.readers, 0, 0,
+        {"auth.readers", &s.authentication.readers,
          "who may read besides administrators, for method pam: user names, @group, or * for everybody"},
-        {"auth.remember_seconds", &s.authentication.rememberFor, 0, 3600,
-         "how long a verified password is remembered; 0 for not at all"}};
+        {"auth.remember_seconds", &s.authentication.rememberFor,
+         "how long a verified password is remembered; 0 for not at all", 0, 3600}};
     for (auto* more : {&limitFields, &otherFields}) {
         for (SettingsField& field : more(s))
             fields.push_back(std::move(field));
@@ -172,6 +180,9 @@ void checkSettings(const Settings& s) {
     refuseIf(s.pulls.timeout > s.pulls.maxTimeout,
              "limits.enumeration_seconds is larger than limits.enumeration_most_seconds. Lower it, or raise "
              "limits.enumeration_most_seconds.");
+    refuseIf(s.uploads.imageBytes > s.uploads.totalBytes,
+             "uploads.image_bytes is larger than uploads.total_bytes. Lower it, or raise "
+             "uploads.total_bytes.");
     refuseIf(s.adapters.empty() != s.adapterState.empty(),
              "Only one of adapters.description and adapters.state is set. Set both, or neither.");
 }

@@ -19,9 +19,9 @@ struct SettingsField {
 
     std::string key;  ///< "section.name" in the file; the option is "--section-name"
     Target target;
-    std::uint64_t least;  ///< of a number; of a text, characters
-    std::uint64_t most;
     std::string help;
+    std::uint64_t least = 0;  ///< of a number; of a text, characters
+    std::uint64_t most = 0;   ///< of a number
 
     std::string option() const;
     bool isFlag() const { return std::holds_alternative<bool*>(target); }
@@ -34,6 +34,8 @@ struct SettingsField {
     void set(const std::string& text) const;
     /// The value as text, for the help.
     std::string text() const;
+    /// The numbers it may be, as "1 to 4096".
+    std::string range() const;
 };
 
 /// All settings, pointing into the given ones.

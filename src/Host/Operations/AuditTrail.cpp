@@ -28,10 +28,10 @@ void AuditTrail::refused(const core::AuditEvent& event, const std::vector<core::
     writeNumbers(now);
     {
         const utils::Mutex::AutoLocker lock(m_mutex);
-        Minute& minute = m_minutes[event.user];
+        Minute& minute = m_minutes[event.caller.principal];
         if (minute.refusals == 0) minute.end = now + m_minute;
         if (++minute.refusals > kListed) {
-            minute.last = {event.user, event.address, event.operation.substr(0, kLongestName), "", ""};
+            minute.last = {event.caller, event.operation.substr(0, kLongestName), "", ""};
             startWriter();
             return;
         }

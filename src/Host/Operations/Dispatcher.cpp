@@ -5,8 +5,9 @@
 #include <new>
 #include <utility>
 
+#include "CimXml/InstanceStream.h"
 #include "Framework/Requests/Audit.h"
-#include "Framework/Requests/PolicyDecision.h"
+#include "Framework/Requests/Caller.h"
 
 namespace host {
 
@@ -40,6 +41,13 @@ struct OutcomeText {
     std::string operator()(const IntrinsicResult&) const { return "done"; }
 };
 
+core::Caller callerOf(const Caller& caller) {
+    return {.principal = caller.user,
+            .address = caller.address,
+            .front = "quenx-cimd",
+            .isAdministrator = caller.isAdministrator};
+}
+
 /// The path that the call names; empty when it names none.
 std::string targetOf(const cimxml::IntrinsicCall& call) {
     for (const cimxml::Parameter& parameter : call.parameters) {
@@ -67,7 +75,7 @@ core::CimOperations& Dispatcher::findNamespace(const std::string& name) const {
 }
 
 IntrinsicResult Dispatcher::callOperation(const cimxml::IntrinsicCall& call, const Caller& caller,
-                                          AnswerCharge& charge) {
+                                          AnswerCharge& charge, core::InstanceSink* stream) {
     const Operation* operation = findOperation(call.operation);
     if (operation != nullptr) requirePrivilege(operation->privilege, caller);
     // The namespace before the operation: clients probe for namespaces with whatever operation they like.
@@ -75,7 +83,7 @@ IntrinsicResult Dispatcher::callOperation(const cimxml::IntrinsicCall& call, con
     if (operation == nullptr) {
         throw CimError(CimStatus::NotSupported, "operation " + call.operation + " is not supported");
     }
-    return operation->handler({target, caller, m_enumerations, charge},
+    return operation->handler({target, caller, m_enumerations, charge, stream},
                               Parameters(call, operation->parameters));
 }
 
@@ -92,8 +100,7 @@ core::MethodResult Dispatcher::callMethod(const cimxml::MethodCall& call, const 
 
 void Dispatcher::audit(const cimxml::Request& request, const Caller& caller,
                        const cimxml::Response& response) try {
-    core::AuditEvent event{caller.user, caller.address, request.name(), "",
-                           std::visit(OutcomeText{}, response.content)};
+    core::AuditEvent event{callerOf(caller), request.name(), "", std::visit(OutcomeText{}, response.content)};
     const auto* method = std::get_if<cimxml::MethodCall>(&request.call);
     event.target = method != nullptr ? method->object.toString()
                                      : targetOf(std::get<cimxml::IntrinsicCall>(request.call));
@@ -111,15 +118,24 @@ void Dispatcher::audit(const cimxml::Request& request, const Caller& caller,
 }
 
 cimxml::Response Dispatcher::dispatch(const cimxml::Request& request, const Caller& caller,
-                                      AnswerCharge& charge) {
-    cimxml::Response response = carryOut(request, caller, charge);
+                                      AnswerCharge& charge, core::InstanceSink* stream) {
+    cimxml::Response response = carryOut(request, caller, charge, stream);
     // However it ended: that somebody was refused is worth knowing, too.
     if (isAudited(request)) audit(request, caller, response);
     return response;
 }
 
+std::string Dispatcher::answer(const cimxml::Request& request, const Caller& caller, AnswerCharge& charge) {
+    cimxml::InstanceStream stream(request.messageId, request.name());
+    cimxml::Response response = dispatch(request, caller, charge, &stream);
+    // What the stream holds of an enumeration that failed is not part of the answer.
+    const auto* result = std::get_if<IntrinsicResult>(&response.content);
+    if (result != nullptr && result->isStreamed) return stream.finish();
+    return cimxml::writeResponse(std::move(response), [&](std::size_t bytes) { charge.cover(bytes); });
+}
+
 cimxml::Response Dispatcher::carryOut(const cimxml::Request& request, const Caller& caller,
-                                      AnswerCharge& charge) {
+                                      AnswerCharge& charge, core::InstanceSink* stream) {
     cimxml::Response response;
     response.messageId = request.messageId;
     response.name = request.name();
@@ -127,14 +143,15 @@ cimxml::Response Dispatcher::carryOut(const cimxml::Request& request, const Call
     response.host = caller.host;
     const ChargingMeter meter(charge);
     try {
-        const core::CallerScope scope({.principal = caller.user});
+        const core::CallerScope scope(callerOf(caller));
         if (m_shuttingDown.load()) {
             throw CimError(CimStatus::ServerIsShuttingDown, "the server is shutting down");
         }
         if (const auto* method = std::get_if<cimxml::MethodCall>(&request.call)) {
             response.content = callMethod(*method, caller);
         } else {
-            response.content = callOperation(std::get<cimxml::IntrinsicCall>(request.call), caller, charge);
+            response.content =
+                callOperation(std::get<cimxml::IntrinsicCall>(request.call), caller, charge, stream);
         }
     } catch (const CimError& error) {
         response.content = ErrorResult{error.status(), core::shownText(error)};

@@ -29,15 +29,21 @@ class Dispatcher {
     /// included. Leaves an audit line for each call that changes something, or would if it were allowed,
     /// but not for too many refusals of one user.
     /// @param charge  of the answer
-    cimxml::Response dispatch(const cimxml::Request& request, const Caller& caller, AnswerCharge& charge);
+    /// @param stream  takes the instances of an enumeration; see OperationContext
+    cimxml::Response dispatch(const cimxml::Request& request, const Caller& caller, AnswerCharge& charge,
+                              core::InstanceSink* stream = nullptr);
+
+    /// The same as a message. Throws OverBudget.
+    std::string answer(const cimxml::Request& request, const Caller& caller, AnswerCharge& charge);
 
     /// From now on every request is answered with "server is shutting down".
     void shutDown() { m_shuttingDown.store(true); }
 
   private:
-    cimxml::Response carryOut(const cimxml::Request& request, const Caller& caller, AnswerCharge& charge);
+    cimxml::Response carryOut(const cimxml::Request& request, const Caller& caller, AnswerCharge& charge,
+                              core::InstanceSink* stream);
     cimxml::IntrinsicResult callOperation(const cimxml::IntrinsicCall& call, const Caller& caller,
-                                          AnswerCharge& charge);
+                                          AnswerCharge& charge, core::InstanceSink* stream);
     core::MethodResult callMethod(const cimxml::MethodCall& call, const Caller& caller);
     core::CimOperations& findNamespace(const std::string& name) const;
     void audit(const cimxml::Request& request, const Caller& caller, const cimxml::Response& response);

@@ -82,6 +82,10 @@ IntrinsicResult enumerateInstances(const OperationContext& context, const Parame
     core::PropertyFilter filter = parameters.list("PropertyList");
     if (!parameters.flag("DeepInheritance", true))
         filter = shallowFilter(context.target.getClass(className), filter);
+    if (context.stream != nullptr && !parameters.flag("IncludeClassOrigin", false)) {
+        context.target.streamInstances(className, filter, *context.stream);
+        return {.kind = ResultKind::NamedInstances, .isStreamed = true};
+    }
     return instancesResult(context, parameters, ResultKind::NamedInstances,
                            context.target.enumerateInstances(className, filter));
 }

@@ -59,7 +59,9 @@ IntrinsicResult open(const OperationContext& context, const Parameters& paramete
         throw CimError(CimStatus::ContinuationOnErrorNotSupported,
                        "an enumeration ends with its first error");
     }
-    IntrinsicResult result = Handler(context, parameters);
+    OperationContext whole = context;
+    whole.stream = nullptr;
+    IntrinsicResult result = Handler(whole, parameters);
     result.kind = Form;
     return context.enumerations.open(ownerOf(context), std::move(result), countOf(parameters),
                                      parameters.number("OperationTimeout"), context.charge);

@@ -30,6 +30,9 @@ struct OperationContext {
     const Caller& caller;
     OpenEnumerations& enumerations;
     AnswerCharge& charge;  ///< of the answer
+    /// Takes the instances of an enumeration instead of the result, which then says so; null when they are
+    /// wanted as values.
+    core::InstanceSink* stream = nullptr;
 };
 
 /// An intrinsic operation. Handlers throw CimError.

@@ -12,6 +12,7 @@
 #include "Framework/Requests/Audit.h"
 #include "Host/Authentication/Authentication.h"
 #include "Host/Authentication/ClientAddress.h"
+#include "Host/Control/Control.h"
 #include "Host/Operations/Dispatcher.h"
 #include "Host/Server/ConnectionWatch.h"
 #include "Host/Server/HttpServer.h"
@@ -34,7 +35,7 @@ struct HeaderSurvey {
 MHD_Result lookAtHeader(void* to, MHD_ValueKind, const char* text, const char* value) {
     // Those that decide for whom, by whom and what is asked; others may come in several parts.
     constexpr std::array kSingle = {"host",         "authorization", "content-type", "content-encoding",
-                                    "cimoperation", "cimmethod",     "cimobject"};
+                                    "cimoperation", "cimmethod",     "cimobject",    "quenx-sha256"};
     auto& survey = *static_cast<HeaderSurvey*>(to);
     const std::string name = utils::lowerCase(text);
     // "Content-Length : 5" is a length to some readers and to others none (RFC 9112 5.1).
@@ -45,19 +46,21 @@ MHD_Result lookAtHeader(void* to, MHD_ValueKind, const char* text, const char* v
     return MHD_YES;
 }
 
-HttpHead readHead(MHD_Connection* connection, const char* method) {
+HttpHead readHead(MHD_Connection* connection, const char* method, const char* path) {
     const auto header = [&](const char* name) -> std::optional<std::string> {
         const char* value = ::MHD_lookup_connection_value(connection, MHD_HEADER_KIND, name);
         return value == nullptr ? std::nullopt : std::optional<std::string>(value);
     };
     HttpHead head;
     head.method = method;
+    head.path = path;
     head.address = addressOf(connection);
     head.host = header("Host").value_or("");
     head.authorization = header("Authorization");
     head.contentType = header("Content-Type");
     head.contentEncoding = header("Content-Encoding");
     head.isChunked = header("Transfer-Encoding").has_value();
+    head.sum = header(control::kSumHeader);
     head.cim = {header("CIMOperation"), header("CIMMethod"), header("CIMObject"),
                 header("CIMProtocolVersion"), header("CIMBatch").has_value()};
     HeaderSurvey survey{head, {}};
@@ -105,11 +108,11 @@ std::string addressOf(MHD_Connection* connection) {
     return info == nullptr || info->client_addr == nullptr ? "unknown" : addressText(*info->client_addr);
 }
 
-HttpRequest::HttpRequest(HttpServer& server, MHD_Connection* connection, const char* method)
+HttpRequest::HttpRequest(HttpServer& server, MHD_Connection* connection, const char* method, const char* path)
     : m_server(server),
       m_connection(connection),
       m_socket(::MHD_get_connection_info(connection, MHD_CONNECTION_INFO_CONNECTION_FD)->connect_fd),
-      m_head(readHead(connection, method)) {
+      m_head(readHead(connection, method, path)) {
     ++m_server.m_inFlight;
 }
 
@@ -126,11 +129,19 @@ bool HttpRequest::isLocal() const {
     return m_head.address == kLocalAddress;
 }
 
+bool HttpRequest::isControl() const {
+    return m_server.m_control != nullptr && Control::serves(m_head.path);
+}
+
+std::optional<HttpAnswer> HttpRequest::checkHead() const {
+    return isControl() ? Control::checkHead(m_head) : host::checkHead(m_head, m_server.m_limits.bodyBytes);
+}
+
 std::optional<HttpAnswer> HttpRequest::authenticate() {
     if (isLocal()) {
         const std::optional<User> user = localUserAt(m_socket);
         if (!user) {
-            core::audit({"", m_head.address, "login", "", "denied: not root"});
+            core::audit({{.address = m_head.address}, "login", "", "denied: not root"});
             return HttpAnswer::plain(403);
         }
         m_user = *user;
@@ -149,6 +160,17 @@ std::optional<HttpAnswer> HttpRequest::authenticate() {
 std::string HttpRequest::quotaName() const {
     // Root on the spot has places of his own; no user of the network has a colon in his name.
     return isLocal() ? "unix:" + m_user.name : m_user.name;
+}
+
+Caller HttpRequest::caller() const {
+    // Paths in the answer carry the name by which the client reached us, since it may come back with them.
+    return {m_user.name, m_user.isAdministrator, m_head.host.empty() ? "localhost" : m_head.host,
+            m_head.address};
+}
+
+std::optional<HttpAnswer> HttpRequest::openCall() {
+    m_call = std::make_unique<ControlCall>(*m_server.m_control, m_head, caller());
+    return m_call->isRefused() ? std::optional(m_call->finish()) : std::nullopt;
 }
 
 std::optional<HttpAnswer> HttpRequest::chargeBody() {
@@ -170,12 +192,13 @@ void HttpRequest::goOn() {
 
 MHD_Result HttpRequest::begin() {
     // If a client may not send its body, it is told before it sends a megabyte.
-    m_refusal = checkHead(m_head, m_server.m_limits.bodyBytes);
+    m_refusal = checkHead();
     if (!m_refusal) m_refusal = authenticate();
-    if (!m_refusal) m_refusal = chargeBody();
+    if (!m_refusal) m_refusal = isControl() ? openCall() : chargeBody();
     // A user who has been removed must not keep his place by requests that are refused.
     if (m_refusal) m_server.m_watch->loggedOut(m_socket);
     goOn();
+    if (m_call && !m_refusal) return MHD_YES;
     if (!m_refusal) {
         // If a client announces a large body and sends none, only this much memory is wasted.
         m_body.reserve(std::min<std::size_t>(*contentLengthOf(m_head), std::size_t{1} << 16));
@@ -190,7 +213,18 @@ MHD_Result HttpRequest::begin() {
 
 void HttpRequest::take(const char* data, std::size_t size) {
     // If the request was refused, the library still hands over its body, which is dropped.
-    if (!m_refusal) m_body.append(data, size);
+    if (m_refusal) return;
+    if (!m_call) {
+        m_body.append(data, size);
+        return;
+    }
+    m_call->take(data, size);
+    // An image may be on its way for long. This much of it has to come in the time for a body.
+    constexpr std::size_t kTimed = std::size_t{64} << 10;
+    m_untimed += size;
+    if (m_untimed < kTimed) return;
+    m_untimed = 0;
+    m_server.m_watch->allow(m_socket, m_server.m_limits.requestTime);
 }
 
 HttpAnswer HttpRequest::carryOut() {
@@ -202,7 +236,10 @@ HttpAnswer HttpRequest::carryOut() {
     Slots& workers = isLocal() ? m_server.m_localWorkers : m_server.m_workers;
     const HeldSlot worker(workers, m_server.m_limits.requestTime, ended);
     if (!worker) return HttpAnswer::withHeader(503, "Retry-After", "10");
-    AnswerCharge charge = m_server.m_dispatcher.charge(user);
+    return m_call ? m_call->finish() : dispatch(m_server.m_dispatcher.charge(user));
+}
+
+HttpAnswer HttpRequest::dispatch(AnswerCharge charge) {
     try {
         const cimxml::Request request = cimxml::readRequest(m_body);
         std::string().swap(m_body);
@@ -210,16 +247,11 @@ HttpAnswer HttpRequest::carryOut() {
         cimxml::checkHeadersAgainst(m_head.cim, request);
         QUENX_DEBUG("%s of %s from %s", utils::escapeForFormat(request.name()).c_str(),
                     utils::escapeForFormat(m_user.name).c_str(), m_head.address.c_str());
-        // Paths in the answer carry the name by which the client reached us, since it may come back with
-        // them.
-        const Caller caller{m_user.name, m_user.isAdministrator,
-                            m_head.host.empty() ? "localhost" : m_head.host, m_head.address};
         HttpAnswer answer{
             200,
             {{"Content-Type", "application/xml; charset=\"utf-8\""}, {"CIMOperation", "MethodResponse"}},
-            cimxml::writeResponse(m_server.m_dispatcher.dispatch(request, caller, charge),
-                                  [&](std::size_t bytes) { charge.cover(bytes); })};
-        charge.set(answer.body.capacity());
+            m_server.m_dispatcher.answer(request, caller(), charge)};
+        charge.set(answer.body.size());
         answer.charge.emplace(std::move(charge));
         return answer;
     } catch (const OverBudget&) {

@@ -4,6 +4,7 @@
 #include <microhttpd.h>
 
 #include <cstdint>
+#include <memory>
 #include <optional>
 #include <string>
 #include <utility>
@@ -13,17 +14,20 @@
 #include "CimXml/WireError.h"
 #include "Host/Authentication/PasswordChecker.h"
 #include "Host/Operations/AnswerBudget.h"
+#include "Host/Operations/Operations.h"
 
 namespace host {
 
 /// What is used of a request's head.
 struct HttpHead {
     std::string method;
+    std::string path;
     std::string address;  ///< the client's
     std::string host;     ///< header Host; empty where there is none
     std::optional<std::string> authorization;
     std::optional<std::string> contentType;
     std::optional<std::string> contentEncoding;
+    std::optional<std::string> sum;           ///< SHA-256 of the body, as one of our own clients says
     std::vector<std::string> contentLengths;  ///< more than one where the client repeats the header
     bool isChunked = false;
     bool isAmbiguous = false;  ///< has a name that is none, or two headers of which only one can count
@@ -51,6 +55,7 @@ std::optional<std::uint64_t> contentLengthOf(const HttpHead& head);
 /// Nothing when the body may be read.
 std::optional<HttpAnswer> checkHead(const HttpHead& head, std::size_t bodyLimit);
 
+class ControlCall;
 class HttpServer;
 
 /// The address of the client, as addressText() has it.
@@ -59,7 +64,7 @@ std::string addressOf(MHD_Connection* connection);
 /// One request, from its head to its answer, on the thread of its connection.
 class HttpRequest {
   public:
-    HttpRequest(HttpServer& server, MHD_Connection* connection, const char* method);
+    HttpRequest(HttpServer& server, MHD_Connection* connection, const char* method, const char* path);
     /// After the answer has gone, or the connection has broken.
     ~HttpRequest();
     HttpRequest(const HttpRequest&) = delete;
@@ -78,11 +83,17 @@ class HttpRequest {
 
   private:
     bool isLocal() const;
+    /// For a path of the daemon's own, and not for CIM-XML.
+    bool isControl() const;
+    std::optional<HttpAnswer> checkHead() const;
     std::optional<HttpAnswer> authenticate();
+    Caller caller() const;
+    std::optional<HttpAnswer> openCall();
     /// Under which the user's share of slots and of the budget is counted.
     std::string quotaName() const;
     std::optional<HttpAnswer> chargeBody();
     HttpAnswer carryOut();
+    HttpAnswer dispatch(AnswerCharge charge);
     /// The client's time runs again, after it has had to wait for us.
     void goOn();
     MHD_Result queue(HttpAnswer answer);
@@ -95,6 +106,8 @@ class HttpRequest {
     User m_user;
     std::optional<HttpAnswer> m_refusal;  ///< waits for the body to be read
     std::string m_body;
+    std::unique_ptr<ControlCall> m_call;       ///< takes the body instead
+    std::size_t m_untimed = 0;                 ///< bytes of it since the client last got time for more
     std::optional<AnswerCharge> m_bodyCharge;  ///< large bodies share the budget of the answers
     bool m_mustDrain = false;
 };

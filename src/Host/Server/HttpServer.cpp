@@ -13,6 +13,7 @@
 #include "Host/Server/HttpRequest.h"
 #include "Host/Server/LocalSocket.h"
 #include "Host/Server/ServerCertificate.h"
+#include "Host/Server/SessionTickets.h"
 #include "Utils/Log.h"
 
 namespace host {
@@ -60,12 +61,12 @@ void logLibrary(void*, const char* format, va_list arguments) {
 
 /// What the HTTP library calls. No exception may pass through it.
 struct HttpServer::Callbacks {
-    static MHD_Result request(void* server, MHD_Connection* connection, const char*, const char* method,
+    static MHD_Result request(void* server, MHD_Connection* connection, const char* path, const char* method,
                               const char*, const char* data, std::size_t* size, void** state) {
         try {
             if (*state == nullptr) {
-                auto made =
-                    std::make_unique<HttpRequest>(*static_cast<HttpServer*>(server), connection, method);
+                auto made = std::make_unique<HttpRequest>(*static_cast<HttpServer*>(server), connection,
+                                                          method, path);
                 *state = made.get();
                 return made.release()->begin();
             }
@@ -94,20 +95,27 @@ struct HttpServer::Callbacks {
                            MHD_ConnectionNotificationCode code) {
         auto& self = *static_cast<HttpServer*>(server);
         const int socket = socketOf(connection);
-        if (code == MHD_CONNECTION_NOTIFY_STARTED)
-            self.m_watch->started(socket);
-        else
+        if (code != MHD_CONNECTION_NOTIFY_STARTED) {
             self.m_watch->closed(socket);
+            return;
+        }
+        self.m_watch->started(socket);
+        const auto* info = ::MHD_get_connection_info(connection, MHD_CONNECTION_INFO_GNUTLS_SESSION);
+        if (info != nullptr && info->tls_session != nullptr)
+            self.m_tickets->offer(static_cast<gnutls_session_t>(info->tls_session));
     }
 };
 
-HttpServer::HttpServer(const ServerLimits& limits, Dispatcher& dispatcher, Authentication& authentication)
+HttpServer::HttpServer(const ServerLimits& limits, Dispatcher& dispatcher, Authentication& authentication,
+                       Control* control)
     : m_limits(limits),
       m_dispatcher(dispatcher),
       m_authentication(authentication),
+      m_control(control),
       m_userSlots(limits.requestsPerUser),
       m_workers(static_cast<std::ptrdiff_t>(limits.workers)),
       m_localWorkers(static_cast<std::ptrdiff_t>(ConnectionWatch::kLocalConnections)),
+      m_tickets(std::make_unique<SessionTickets>()),
       m_watch(std::make_unique<ConnectionWatch>(limits)) {}
 
 HttpServer::~HttpServer() {
@@ -123,6 +131,8 @@ HttpServer::~HttpServer() {
 void HttpServer::setCertificate(std::shared_ptr<const ServerCertificate> certificate) {
     currentCertificate.store(certificate.get());
     m_certificates.push_back(std::move(certificate));
+    // Last: until here somebody whom the old one convinced may have got a ticket.
+    m_tickets->forget();
 }
 
 MHD_Daemon* HttpServer::library(bool tls) {

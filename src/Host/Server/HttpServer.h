@@ -19,10 +19,12 @@ struct MHD_Daemon;
 namespace host {
 
 class ConnectionWatch;
+class Control;
 class Dispatcher;
 class HttpRequest;
 class LocalSocket;
 class ServerCertificate;
+class SessionTickets;
 
 /// An address and port that cannot be listened on. what() tells a person why, and what to do.
 class ListenError : public std::runtime_error {
@@ -45,7 +47,9 @@ int openListener(const std::string& address, std::uint16_t port);
 /// since TLS asks for the certificate through a function without context. Thread-safe.
 class HttpServer {
   public:
-    HttpServer(const ServerLimits& limits, Dispatcher& dispatcher, Authentication& authentication);
+    /// @param control  serves paths of the daemon's own; null for none. Everything outlives the server
+    HttpServer(const ServerLimits& limits, Dispatcher& dispatcher, Authentication& authentication,
+               Control* control = nullptr);
     /// Ends all connections and waits for their threads.
     ~HttpServer();
     HttpServer(const HttpServer&) = delete;
@@ -56,7 +60,7 @@ class HttpServer {
     std::uint16_t listen(const std::string& address, std::uint16_t port, bool tls);
     /// On a Unix socket. Throws std::runtime_error.
     void listenLocally(const std::string& path);
-    /// What connections from now on are shown.
+    /// What connections from now on are shown. None of them goes on with a session of before.
     void setCertificate(std::shared_ptr<const ServerCertificate> certificate);
 
     /// Users may have been removed: has those who are idle log in again before they count as logged in.
@@ -77,6 +81,7 @@ class HttpServer {
     const ServerLimits m_limits;
     Dispatcher& m_dispatcher;
     Authentication& m_authentication;
+    Control* const m_control;
     UserSlots m_userSlots;
     Slots m_workers;
     Slots m_localWorkers;
@@ -84,6 +89,7 @@ class HttpServer {
     std::atomic<bool> m_stopping{false};
     /// All so far: a handshake may still use an old one.
     std::vector<std::shared_ptr<const ServerCertificate>> m_certificates;
+    std::unique_ptr<SessionTickets> m_tickets;
     std::unique_ptr<ConnectionWatch> m_watch;
     std::array<MHD_Daemon*, 2> m_libraries{};  ///< plain and with TLS, once they are needed
     std::unique_ptr<LocalSocket> m_localSocket;

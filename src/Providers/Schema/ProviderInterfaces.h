@@ -8,6 +8,7 @@
 #include "Utils/Export.h"
 #include "Utils/FirmwareTypes.h"
 #include "Utils/StringArray.h"
+#include "Utils/Time.h"
 
 namespace core {
 class CimPath;
@@ -72,7 +73,19 @@ class QUENX_EXPORT SoftwareIdentityResource {
 
 namespace update {
 
-/// Judges images without installing them, and tells which adapter the process holds.
+/// The hold on the one adapter that a process services at a time.
+struct Claim {
+    std::string adapter = {};  ///< empty while none is held
+    std::string user = {};     ///< who had it claimed, as the front knows him; empty where none said
+    std::string job = {};      ///< the InstanceID of the job that it is for; empty for a check
+    utils::Time since{};
+    bool isAtWork = false;  ///< a verification or a job needs it; false for what a check has left behind
+};
+
+/// What became of a claim that was to be given back.
+enum class ClaimRelease { Freed, NotHeld, AtWork };
+
+/// Judges images without installing them, and tells which adapter the process holds, and for whom.
 class QUENX_EXPORT ImageCheck {
   public:
     virtual ~ImageCheck();
@@ -84,6 +97,11 @@ class QUENX_EXPORT ImageCheck {
                                     const std::vector<std::string>& values) = 0;
     /// The adapter that is claimed in this process, by an update or by a check; empty for none. Thread-safe.
     virtual std::string claimedAdapter() const = 0;
+    /// The same with who holds it, and for what. Thread-safe.
+    virtual Claim claim() const = 0;
+    /// Frees the adapter from a claim that a check has left behind; one that a job or a verification needs
+    /// stays. Thread-safe. @throws core::CimError where the policy does not let the caller
+    virtual ClaimRelease releaseClaim(const std::string& adapter) = 0;
 };
 
 /// The image check of the service that the path names, where it has one; null otherwise. Good until the

@@ -10,6 +10,7 @@
 #include "Providers/SoftwareUpdate/Quenx_ConcreteJob.h"
 #include "Providers/SoftwareUpdate/Quenx_SoftwareInstallationService.h"
 #include "Providers/SoftwareUpdate/Quenx_SoftwareInstallationServiceCapabilities.h"
+#include "Providers/SoftwareUpdate/UpdateReport.h"
 #include "Utils/Log.h"
 #include "Utils/Os/Linux/PatientReading.h"
 #include "Utils/Os/Linux/SMASHv2Config.h"
@@ -209,6 +210,10 @@ PreparedImage readAndPrepare(const UpdateOrder& order, bool& isAskingAdapter) {
     // The size that it had when it was opened: whatever happens to the file, buffers and preparation agree.
     const std::uint32_t fileSize = file.measure();
     const Buffer source = file.takeBytes();
+    // Beside the preparation, which takes about as long. Ends before the bytes go, and before they are
+    // judged.
+    std::optional<UpdateReport::Examination> examination(
+        std::in_place, std::span<const std::uint8_t>(source.get(), fileSize));
     Buffer image = std::make_unique_for_overwrite<std::uint8_t[]>(fileSize);
     std::uint32_t imageSize = fileSize;
     std::vector<utils::FirmwareType> types = getTargetTypes(options, values);
@@ -218,6 +223,7 @@ PreparedImage readAndPrepare(const UpdateOrder& order, bool& isAskingAdapter) {
     const int status =
         ma::prepareFlashImage(adapterName, source.get(), fileSize, image.get(), &imageSize, types);
     isAskingAdapter = false;
+    examination.reset();
     utils::formatDebugLog(__FILE__, kCheckAndVerifyImage, __LINE__, "Image prepared %d", status);
     const bool force =
         Quenx_SoftwareInstallationService::IsValueDefined(InstallOption::ForceInstallation, options);

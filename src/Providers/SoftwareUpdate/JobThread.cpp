@@ -88,6 +88,8 @@ void JobThread::execute() {
         QUENX_DEBUG("Access to the KD is disabled at this moment.");
         m_myJob->setLastError(kTimeoutErrorCode, "Timeout Error");
     }
+    // First, so that whoever sees the end finds it in the history, too.
+    m_myJob->endRecord(succeeded);
     m_myJob->setJobState(succeeded ? JobStateCompleted : JobStateException);
     // From here on an enumeration of the jobs may destroy this object; the destructor waits for this thread.
     m_executed = true;

@@ -3,6 +3,7 @@
 
 #include <optional>
 
+#include "Providers/SoftwareUpdate/UpdateReport.h"
 #include "Utils/Log.h"
 
 namespace {
@@ -70,6 +71,7 @@ bool isRefusal(const utils::Exception& exception) {
 }
 
 int verifyJobResultOf(const utils::Exception& exception) noexcept {
+    UpdateReport::noteReason(exception.what());
     const std::optional<int> code = codeOf(exception);
     // What is not a refusal has logged itself, if it could.
     if (!code) return VerifyJobResult::UnspecifiedError;

@@ -4,6 +4,7 @@
 #include <optional>
 
 #include "Framework/Model/CimClassInfo.h"
+#include "Framework/Requests/UpdateSink.h"
 #include "MidAPI/ma.h"
 #include "Providers/ClassObjects.h"
 #include "Providers/SoftwareUpdate/ImageVerification.h"
@@ -66,6 +67,7 @@ Quenx_ConcreteJob::Quenx_ConcreteJob(std::string adapterName, int jobId, std::st
     m_flashImageSize = verified.image.size;
     m_imageTypes = std::move(verified.image.types);
     try {
+        m_claim.passTo(fmt("Quenx:%s", getUniqId().c_str()));
         m_myThread = std::make_unique<JobThread>(this);
     } catch (...) {
         m_claim.releaseIfConfigured();
@@ -108,6 +110,19 @@ void Quenx_ConcreteJob::setLastError(std::uint32_t code, std::string text) {
     const utils::Mutex::AutoLocker lock(m_stateMutex);
     m_lastErrorCode = code;
     m_lastErrorText.swap(text);
+    m_isEndServed = false;
+}
+
+void Quenx_ConcreteJob::endRecord(bool succeeded) {
+    if (!m_record) return;
+    std::uint32_t code = 0;
+    std::string text;
+    {
+        const utils::Mutex::AutoLocker lock(m_stateMutex);
+        code = m_lastErrorCode;
+        text = m_lastErrorText;
+    }
+    m_record->end(succeeded, code, text);
 }
 
 void Quenx_ConcreteJob::setJobState(JobStateVal state) {
@@ -117,6 +132,7 @@ void Quenx_ConcreteJob::setJobState(JobStateVal state) {
     const utils::Mutex::AutoLocker lock(m_stateMutex);
     m_jobState = state;
     m_startClaimed = false;
+    m_isEndServed = false;
     m_timeOfLastStateChange.resetTimer();
     m_adapterGivenUp = givesUpTheAdapter(state).value_or(m_adapterGivenUp);
     if (state == JobStateCompleted) m_elapsedTime = timeSinceStart();
@@ -195,7 +211,13 @@ bool Quenx_ConcreteJob::threadControl(ThreadOperationCommand command, int timeou
     return disposing;
 }
 
+bool Quenx_ConcreteJob::isEndServed() const {
+    const utils::Mutex::AutoLocker lock(m_stateMutex);
+    return m_isEndServed;
+}
+
 void Quenx_ConcreteJob::refresh() {
+    if (isEndServed()) return;
     // Asked first: the adapter API may be slow, and nothing slow runs under the property lock.
     const std::uint16_t percentComplete = getPercentComplete();
 
@@ -223,4 +245,5 @@ void Quenx_ConcreteJob::refresh() {
     ErrorDescription = m_lastErrorText;
     JobState = static_cast<std::uint16_t>(m_jobState);
     TimeOfLastStateChange = m_timeOfLastStateChange;
+    m_isEndServed = hasEnded(m_jobState);
 }

@@ -4,6 +4,7 @@
 #include <cstdint>
 #include <memory>
 #include <string>
+#include <utility>
 #include <vector>
 
 #include "Framework/Model/CimClassInfo.h"
@@ -15,6 +16,9 @@
 #include "Utils/Os/Linux/linux.h"
 #include "Utils/Time.h"
 
+namespace core {
+class UpdateRecord;
+}
 class JobThread;
 
 /// The requested states of jobs; only Start is accepted.
@@ -45,7 +49,8 @@ class Quenx_ConcreteJob : public CIM_ConcreteJob {
     /// Waits for a worker that has been started, and so for a flash that has begun.
     ~Quenx_ConcreteJob() override;
 
-    /// Sets every property from the current state. Asks the adapter API for the progress of a running job.
+    /// Sets every property from the current state, or leaves them if they tell the job's end already. Asks
+    /// the adapter API for the progress of a running job.
     virtual void refresh();
     /// The one way to the worker; one command at a time per job. The time-out is in milliseconds and matters
     /// to ThreadTerminate only. False when a start failed, a termination timed out, or there was nothing to
@@ -64,6 +69,10 @@ class Quenx_ConcreteJob : public CIM_ConcreteJob {
 
     /// Keeps what the adapter API reported; the code is served cut to 16 bits.
     void setLastError(std::uint32_t code, std::string text);
+    /// What the history has of this update; to be set before the worker starts, null for nothing.
+    void setRecord(std::shared_ptr<core::UpdateRecord> record) { m_record = std::move(record); }
+    /// The flash has ended, and the last error is that of its end.
+    void endRecord(bool succeeded);
     /// Enters a state. Ending the job frees the image and the adapter claim in the same step, so that whoever
     /// sees the end can start the next update.
     void setJobState(JobStateVal state);
@@ -90,6 +99,7 @@ class Quenx_ConcreteJob : public CIM_ConcreteJob {
     /// True for the one caller who may start the job.
     bool claimStart();
     utils::Time timeSinceStart() const;
+    bool isEndServed() const;
 
     const std::string m_adapterName;
     const int m_jobId;
@@ -97,6 +107,7 @@ class Quenx_ConcreteJob : public CIM_ConcreteJob {
     std::unique_ptr<std::uint8_t[]> m_flashImage QUENX_GUARDED_BY(m_stateMutex);
     std::uint32_t m_flashImageSize QUENX_GUARDED_BY(m_stateMutex) = 0;
     std::vector<utils::FirmwareType> m_imageTypes;  ///< set by the constructor only
+    std::shared_ptr<core::UpdateRecord> m_record;   ///< set before the worker starts
     const utils::Time m_startTime;
     utils::Time m_elapsedTime QUENX_GUARDED_BY(m_stateMutex);
     JobStateVal m_jobState QUENX_GUARDED_BY(m_stateMutex) = JobStateNew;
@@ -108,6 +119,8 @@ class Quenx_ConcreteJob : public CIM_ConcreteJob {
     std::uint32_t m_lastErrorCode QUENX_GUARDED_BY(m_stateMutex) = 0;
     std::string m_lastErrorText QUENX_GUARDED_BY(m_stateMutex);
     std::uint32_t m_percentComplete QUENX_GUARDED_BY(m_stateMutex) = 0;
+    /// The properties say how the job ended, so a refresh would change nothing. False again with any change.
+    bool m_isEndServed QUENX_GUARDED_BY(m_stateMutex) = false;
     const std::uint64_t m_start = os::getMonotonicuSeconds();  ///< measures what m_startTime tells
     mutable utils::Mutex m_stateMutex;  ///< what the worker writes and requests read; held for moments only
 };

@@ -4,10 +4,22 @@
 #include "Framework/Classes/RequestScope.h"
 #include "Framework/Requests/PolicyDecision.h"
 #include "Providers/SoftwareUpdate/MethodResults.h"
+#include "Providers/SoftwareUpdate/UpdateReport.h"
 
 namespace {
 
 constexpr std::uint32_t kStartTimeout = 100;  // seconds
+
+void bringUpToDate(Quenx_ConcreteJob& job) {
+    QUENX_DEBUG("Refreshing job: %s", job.getUniqId().c_str());
+    try {
+        // A worker cannot destroy itself, so it is kept until somebody looks at the job.
+        job.threadControl(ThreadDispose, 0);
+    } catch (...) {
+        QUENX_DEBUG("Exception happened");
+    }
+    job.refresh();
+}
 
 }  // namespace
 
@@ -17,19 +29,16 @@ utils::SafeList<core::CimInstance*>::Iterator Quenx_ConcreteJobClass::getInstanc
     const utils::TimeStamp timing("ConcreteJob::getInstances");
     core::InstanceRange jobs(m_instances.getElements(false));
     QUENX_DEBUG("All jobs: %d", static_cast<int>(jobs.size()));
-    for (core::CimInstance* each : jobs) {
-        auto* job = static_cast<Quenx_ConcreteJob*>(each);
-        QUENX_DEBUG("Refreshing job: %s", job->getUniqId().c_str());
-        try {
-            // A worker cannot destroy itself, so it is kept until somebody looks at the jobs.
-            job->threadControl(ThreadDispose, 0);
-        } catch (...) {
-            QUENX_DEBUG("Exception happened");
-        }
-        job->refresh();
-    }
+    for (core::CimInstance* each : jobs)
+        bringUpToDate(*static_cast<Quenx_ConcreteJob*>(each));
     QUENX_DEBUG("return %d", static_cast<int>(m_instances.size()));
     return m_instances.getElements(false);
+}
+
+core::CimInstance* Quenx_ConcreteJobClass::findInstance(const core::CimPath& path) {
+    auto* job = static_cast<Quenx_ConcreteJob*>(m_instances.find(path));
+    if (job != nullptr) bringUpToDate(*job);
+    return job;
 }
 
 int Quenx_ConcreteJobClass::verifyOrCreateNewJob(std::string adapterName, std::string uri,
@@ -58,6 +67,12 @@ int Quenx_ConcreteJobClass::createJob(UpdateOrder& order, Quenx_ConcreteJob*& jo
         m_instances.add(created);
         listed = true;
         created->refresh();
+        // Before the flash, so that one that never ends has its record.
+        if (!UpdateReport::begin(*created)) {
+            created->setJobState(JobStateException);  // gives the claim back
+            m_instances.remove(created);
+            return VerifyJobResult::UnspecifiedError;
+        }
         utils::Time timeout;
         timeout.setIntervalInSeconds(kStartTimeout);
         if (created->requestStateChange(RequestedStateStart, timeout) == 0) {

@@ -34,6 +34,9 @@ class Quenx_ConcreteJobClass : public ListedClass<Quenx_ConcreteJob> {
     /// Refreshes every job, and disposes of workers that have finished.
     utils::SafeList<core::CimInstance*>::Iterator getInstances() override;
 
+    /// Does the same for the one job that the path names; null when it names none.
+    core::CimInstance* findInstance(const core::CimPath& path);
+
     /// Verifies an image for an adapter, and with `create` makes a job of it and starts it. Never throws for
     /// a refusal: returns a VerifyJobResult code.
     /// @param job  set with `create` and code 0 only, else null; stays owned by the registry

@@ -7,6 +7,7 @@
 #include "Framework/Requests/PolicyDecision.h"
 #include "Providers/SoftwareUpdate/MethodArguments.h"
 #include "Providers/SoftwareUpdate/Quenx_ConcreteJobClass.h"
+#include "Providers/SoftwareUpdate/UpdateReport.h"
 #include "Utils/Os/Linux/linux.h"
 #include "Utils/Utils.h"
 
@@ -23,6 +24,9 @@ constexpr std::uint16_t kRefusedOptions[] = {
     InstallOption::Reboot,     InstallOption::Password,   InstallOption::Uninstall,
     InstallOption::Log,        InstallOption::SilentMode, InstallOption::AdministrativeMode,
 };
+
+constexpr const char* kRefusedOptionsText =
+    "InstallOptions lacks 5 (Update), or has one that is not supported";
 
 bool areOptionsAccepted(const std::vector<std::uint16_t>& options) {
     const auto isGiven = [&options](std::uint16_t option) {
@@ -64,11 +68,14 @@ template <class OnSuccess>
 unsigned int carryOut(const MethodKind& kind, const core::CimPath* source, const core::CimPath& target,
                       UpdateOrder order, OnSuccess&& onSuccess) {
     const core::PolicyDecision decision;  // for callers that come without the request layer
-    if (const auto refused = resolve(kind, source, target, order)) return *refused;
+    const auto refused = resolve(kind, source, target, order);
+    UpdateReport::noteOrder(order, target);
+    if (refused) return *refused;
     // Not within the try: a registry that is missing is a mistake in the program, and is to be seen as one.
     Quenx_ConcreteJobClass& registry = jobRegistry();
     const std::string targetText = target.toString();
     try {
+        if (kind.createsJob && !UpdateReport::mayBegin()) return MethodReturn::UnspecifiedError;
         Quenx_ConcreteJob* job = nullptr;
         const int result = registry.verifyOrCreateNewJob(order.adapterName, order.uri, order.options,
                                                          order.values, job, kind.createsJob);
@@ -85,14 +92,25 @@ unsigned int carryOut(const MethodKind& kind, const core::CimPath* source, const
 
 Quenx_SoftwareInstallationService::Quenx_SoftwareInstallationService() {
     // By the virtual members, so that a derived class can replace a method.
-    addMethod("InstallFromSoftwareIdentity", &Quenx_SoftwareInstallationService::InstallFromSoftwareIdentity);
-    addMethod("InstallFromURI", &Quenx_SoftwareInstallationService::InstallFromURI);
+    addMethod("InstallFromSoftwareIdentity", &Quenx_SoftwareInstallationService::reportFromSoftwareIdentity);
+    addMethod("InstallFromURI", &Quenx_SoftwareInstallationService::reportFromUri);
     addMethod("CheckSoftwareIdentity", &Quenx_SoftwareInstallationService::CheckSoftwareIdentity);
 }
 
 bool Quenx_SoftwareInstallationService::IsValueDefined(std::uint16_t value,
                                                        const std::vector<std::uint16_t>& values) {
     return std::find(values.begin(), values.end(), value) != values.end();
+}
+
+unsigned int Quenx_SoftwareInstallationService::reportFromUri(CimPropertyList& in, CimPropertyList& out,
+                                                              core::CimInstance*& job) {
+    return reported([&] { return InstallFromURI(in, out, job); });
+}
+
+unsigned int Quenx_SoftwareInstallationService::reportFromSoftwareIdentity(CimPropertyList& in,
+                                                                           CimPropertyList& out,
+                                                                           core::CimInstance*& job) {
+    return reported([&] { return InstallFromSoftwareIdentity(in, out, job); });
 }
 
 unsigned int Quenx_SoftwareInstallationService::InstallFromURI(CimPropertyList& in, CimPropertyList&,
@@ -107,7 +125,11 @@ unsigned int Quenx_SoftwareInstallationService::InstallFromURI(CimPropertyList& 
                       arguments.text("URI"),
                       arguments.codes("InstallOptions"),
                       arguments.texts("InstallOptionsValues")};
-    if (!areOptionsAccepted(order.options)) return MethodReturn::InvalidParameter;
+    UpdateReport::noteOrder(order, target);
+    if (!areOptionsAccepted(order.options)) {
+        UpdateReport::noteReason(kRefusedOptionsText);
+        return MethodReturn::InvalidParameter;
+    }
     return carryOut(kInstalling, nullptr, target, std::move(order),
                     [&job](Quenx_ConcreteJob* created) { job = created; });
 }
@@ -126,9 +148,11 @@ unsigned int Quenx_SoftwareInstallationService::InstallFromSoftwareIdentity(CimP
     const core::CimPath source = arguments.path("Source");
     const core::CimPath target = arguments.path("Target");
     UpdateOrder order{{}, {}, arguments.codes("InstallOptions"), arguments.texts("InstallOptionsValues")};
+    UpdateReport::noteOrder(order, target);
     QUENX_DEBUG("Starting arguments verification success");
     if (!areOptionsAccepted(order.options) || IsValueDefined(InstallOption::TargetTypes, order.options)) {
         QUENX_DEBUG("One of value of InstallOptions value is not supported");
+        UpdateReport::noteReason(kRefusedOptionsText);
         return MethodReturn::InvalidParameter;
     }
     return carryOut(kInstalling, &source, target, std::move(order),
@@ -178,6 +202,15 @@ unsigned int Quenx_SoftwareInstallationService::checkImage(const std::string& ur
 
 std::string Quenx_SoftwareInstallationService::claimedAdapter() const {
     return Quenx_ConcreteJob::m_servicedAdapter.get();
+}
+
+update::Claim Quenx_SoftwareInstallationService::claim() const {
+    return AdapterClaim::current(Quenx_ConcreteJob::m_servicedAdapter);
+}
+
+update::ClaimRelease Quenx_SoftwareInstallationService::releaseClaim(const std::string& adapter) {
+    const core::PolicyDecision decision;
+    return AdapterClaim::releaseLeft(Quenx_ConcreteJob::m_servicedAdapter, adapter);
 }
 
 void Quenx_SoftwareInstallationService::refresh() {

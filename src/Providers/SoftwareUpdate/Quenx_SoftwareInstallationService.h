@@ -34,10 +34,19 @@ class Quenx_SoftwareInstallationService : public CIM_SoftwareInstallationService
                             const std::vector<std::uint16_t>& options,
                             const std::vector<std::string>& values) override;
     std::string claimedAdapter() const override;
+    update::Claim claim() const override;
+    update::ClaimRelease releaseClaim(const std::string& adapter) override;
 
     /// "FirmwareUpdate", for every instance.
     static std::string getUniqId() { return "FirmwareUpdate"; }
     static bool IsValueDefined(std::uint16_t value, const std::vector<std::uint16_t>& values);
+
+  private:
+    // What clients call: the methods, with a report of how they went.
+    unsigned int reportFromUri(core::CimPropertyList& in, core::CimPropertyList& out,
+                               core::CimInstance*& job);
+    unsigned int reportFromSoftwareIdentity(core::CimPropertyList& in, core::CimPropertyList& out,
+                                            core::CimInstance*& job);
 };
 
 class Quenx_SoftwareInstallationServiceClass : public SingletonClass<Quenx_SoftwareInstallationService> {

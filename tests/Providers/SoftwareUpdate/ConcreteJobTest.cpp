@@ -63,6 +63,9 @@ TEST_F(ConcreteJobTest, StartsNewAndIsStartedOnce) {
     EXPECT_EQ(job->getFlashImage(), nullptr) << "it has megabytes";
     EXPECT_EQ(job->requestStateChange(RequestedStateStart, utils::Time()), 4097U);
     EXPECT_TRUE(test::SyslogCapture::contains("Cannot start job that is not in 'NEW' state"));
+    job->setLastError(7, "afterwards");
+    job->refresh();
+    EXPECT_EQ(job->ErrorDescription.get(), "afterwards") << "an end that was served may change";
 }
 
 TEST_F(ConcreteJobTest, MayBeUsedByAnyThreadAtOnce) {
@@ -91,6 +94,20 @@ TEST_F(ConcreteJobTest, MayBeUsedByAnyThreadAtOnce) {
         operations.emplace_back([&] { job->setJobState(JobStateException); });
         test::together(operations);
     }
+}
+
+TEST_F(ConcreteJobTest, IsReadWithoutTheOthers) {
+    const core::CimPath first = *install(goodImage(), "eth0").job;
+    waitForEnd(first);
+    m_backend->hold("writeFlashImage");
+    const core::CimPath second = *install(goodImage(), "eth0").job;
+    m_backend->waitUntilHeld();
+    test::SyslogCapture::clear();
+    EXPECT_EQ(state(m_requests.getInstance(second)), JobStateRunning);
+    EXPECT_TRUE(test::SyslogCapture::contains("Refreshing job: FirmwareUpdate@Job#2"));
+    EXPECT_FALSE(test::SyslogCapture::contains("Job#1"));
+    m_backend->letGo();
+    EXPECT_EQ(state(waitForEnd(second)), JobStateCompleted);
 }
 
 TEST_F(ConcreteJobTest, ReadsTargetTypesFromTheOptions) {

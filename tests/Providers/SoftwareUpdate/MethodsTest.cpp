@@ -7,6 +7,7 @@
 #include "Framework/Classes/CimBroker.h"
 #include "Framework/Classes/RequestScope.h"
 #include "Framework/Requests/PolicyDecision.h"
+#include "Framework/Requests/UpdateSink.h"
 #include "MidAPI/Image/RomFormat.h"
 #include "Providers/ClassObjects.h"
 #include "Providers/Schema/CIM_PortController.h"
@@ -283,7 +284,7 @@ TEST_F(MethodsTest, AsksThePolicyBeforeAnythingIsClaimed) {
     utils::systemPolicyFile = machines;
     utils::PolicyFile policy(file);
     EXPECT_EQ(errorFor({"alice"}), "");
-    EXPECT_EQ(errorFor({"quenx-cimd", true}), "");
+    EXPECT_EQ(errorFor({.principal = "quenx-cimd", .isFront = true}), "");
     const std::string place = "\"administrators\" in " + file + ", line 1, ";
     EXPECT_EQ(errorFor({"bob"}), "user \"bob\" may only read: " + place + "has no such name");
     EXPECT_EQ(errorFor({}), "a caller without a name may only read: " + place + "is set");
@@ -293,6 +294,46 @@ TEST_F(MethodsTest, AsksThePolicyBeforeAnythingIsClaimed) {
                   ", line 3: the policy: \"administrators\" must be a list of user names, such as "
                   "[\"root\", \"alice\"]");
     EXPECT_FALSE(m_requests.enumerateInstances("Quenx_EthernetPort").empty());
+}
+
+/// A history that fails when it is asked, or later.
+class FailingSink : public core::UpdateSink {
+  public:
+    std::future<core::ImageFacts> examine(std::span<const std::uint8_t>) noexcept override { return {}; }
+    void refused(const core::UpdateAttempt& attempt, unsigned int returnValue,
+                 const std::string& reason) noexcept override {
+        said += attempt.caller.principal + " " + std::to_string(returnValue) + ": " + reason + "\n";
+    }
+    std::string problem() override { return m_problem; }
+    std::shared_ptr<core::UpdateRecord> begin(const core::UpdateAttempt&) noexcept override { return {}; }
+
+    std::string m_problem = "the disk is full";
+    std::string said;
+};
+
+TEST_F(MethodsTest, InstallsNothingWithoutTheHistoryThatThePolicyRequires) {
+    const utils::PolicyFile policy(m_folder.write("policy.toml", "history = \"required\"\n"));
+    const core::CallerScope scope({.principal = "alice"});
+    const auto expectRefused = [&] {
+        EXPECT_EQ(install(goodImage(), "eth0").returnValue, MethodReturn::UnspecifiedError);
+        EXPECT_EQ(claim(), "");
+        EXPECT_TRUE(m_requests.enumerateInstances("Quenx_ConcreteJob").empty());
+    };
+    expectRefused();
+    const std::string text = "The policy requires a history of updates, and none can be written: ";
+    EXPECT_TRUE(test::SyslogCapture::contains(text + "this program keeps none"));
+    const auto sink = std::make_shared<FailingSink>();
+    std::optional<core::InstalledSink> installed(sink);
+    expectRefused();
+    sink->m_problem.clear();
+    expectRefused();
+    EXPECT_EQ(sink->said, "alice 2: " + text + "the disk is full\nalice 2: " + text +
+                              "its record was not written in time\n");
+    m_folder.write("policy.toml", "history = \"off\"\n");
+    EXPECT_EQ(install("file:///none", "eth0").returnValue, MethodReturn::InvalidParameter);
+    m_folder.write("policy.toml", "history = \"wanted\"\n");
+    waitForEnd(*install(goodImage(), "eth0").job);
+    EXPECT_EQ(std::ranges::count(sink->said, '\n'), 2);
 }
 
 }  // namespace

@@ -1,0 +1,85 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include <cstdint>
+#include <memory>
+#include <optional>
+#include <stdexcept>
+#include <string>
+
+struct sqlite3;
+struct sqlite3_stmt;
+
+namespace history {
+
+/// A failure of SQLite, in its words.
+class DatabaseError : public std::runtime_error {
+  public:
+    DatabaseError(int code, const std::string& what) : std::runtime_error(what), m_code(code) {}
+    /// The file is no database, or a damaged one.
+    bool isDamage() const;
+
+  private:
+    int m_code;
+};
+
+/// A connection to a database file. Used by one thread of one process. Operations throw DatabaseError.
+class Database {
+  public:
+    /// The file has to be there, may be empty, and must not be reached over a link.
+    explicit Database(const std::string& path);
+
+    void execute(const std::string& sql);
+    /// The first column of the first row; 0 without one.
+    std::int64_t number(const std::string& sql);
+    std::string text(const std::string& sql);
+    std::int64_t lastId() const;
+    /// How many rows the last statement changed.
+    int changes() const;
+
+  private:
+    friend class Statement;
+    struct Close {
+        void operator()(sqlite3* database) const;
+    };
+    std::unique_ptr<sqlite3, Close> m_database;
+};
+
+/// A statement with its parameters, which are counted from 1, as columns are from 0.
+class Statement {
+  public:
+    Statement(Database& database, const std::string& sql);
+
+    void bind(int parameter, std::int64_t number);
+    void bind(int parameter, const std::string& text);  ///< an empty one as no value
+    void bind(int parameter, const std::optional<std::int64_t>& number);
+
+    /// The next row; false when there is none.
+    bool step();
+    std::optional<std::int64_t> number(int column) const;
+    std::string text(int column) const;
+
+  private:
+    struct Finalize {
+        void operator()(sqlite3_stmt* statement) const;
+    };
+    Database& m_database;
+    std::unique_ptr<sqlite3_stmt, Finalize> m_statement;
+};
+
+/// Either all changes of a scope, or none: without commit() none.
+class Transaction {
+  public:
+    /// Waits for other writers, within bounds.
+    explicit Transaction(Database& database);
+    ~Transaction();
+    Transaction(const Transaction&) = delete;
+    Transaction& operator=(const Transaction&) = delete;
+    void commit();
+
+  private:
+    Database& m_database;
+    bool m_isOpen = true;
+};
+
+}  // namespace history

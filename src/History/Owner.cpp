@@ -1,0 +1,77 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "History/Owner.h"
+
+#include <unistd.h>
+
+#include <cstdlib>
+#include <filesystem>
+#include <random>
+#include <sstream>
+
+#include "Utils/Utils.h"
+
+namespace history {
+
+namespace {
+
+constexpr const char* kPrefix = "owner-";
+
+std::string systemText(const char* path) {
+    const std::string text = os::readSystemText(path).value_or("");
+    return text.substr(0, text.find('\n'));
+}
+
+/// A service that sees only processes of /proc is told the boot's id by its manager.
+std::string bootId() {
+    const std::string id = systemText("/proc/sys/kernel/random/boot_id");
+    const char* told = os::getEnvVariable("QUENX_BOOT_ID");
+    return id.empty() && told != nullptr ? told : id;
+}
+
+/// The 22nd field of the line; the second one, the name, may hold blanks and parentheses.
+std::string startTime() {
+    constexpr int kFieldsAfterName = 20;
+    const std::string line = systemText("/proc/self/stat");
+    std::istringstream fields(line.substr(std::min(line.rfind(')') + 1, line.size())));
+    std::string field;
+    for (int i = 0; i < kFieldsAfterName; ++i)
+        fields >> field;
+    return fields ? field : "";
+}
+
+/// The number of a process that died may be given again; these names are not.
+std::string uniqueName() {
+    std::random_device random;
+    return kPrefix + std::to_string(::getpid()) + "-" + startTime() + "-" + std::to_string(random());
+}
+
+}  // namespace
+
+ThisProcess describeThisProcess() {
+    return {systemText("/proc/self/comm"), startTime(), bootId()};
+}
+
+Owner::Owner(const std::string& folder)
+    : m_name(uniqueName()), m_path(folder + "/" + m_name), m_lock(std::make_unique<os::FileLock>(m_path)) {}
+
+Owner::~Owner() {
+    // A child that was forked has the lock's file, but is not the one that its name is of.
+    if (m_lock->isHeld()) ::unlink(m_path.c_str());
+}
+
+void Owner::sweep(const std::string& folder) {
+    for (const std::string& name : os::listDirectory(folder)) {
+        if (!name.starts_with(kPrefix)) continue;
+        const std::string path = folder + "/" + name;
+        const os::FileLock lock(path);
+        if (lock.isHeld()) ::unlink(path.c_str());
+    }
+}
+
+bool Owner::isAlive(const std::string& folder, const std::string& name) {
+    std::error_code ignored;
+    return name.starts_with(kPrefix) && name.find('/') == std::string::npos &&
+           std::filesystem::exists(folder + "/" + name, ignored);
+}
+
+}  // namespace history

@@ -1,0 +1,77 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include <cstdint>
+#include <exception>
+#include <memory>
+#include <span>
+#include <string>
+#include <string_view>
+#include <vector>
+
+#include "Framework/Model/CimValue.h"
+#include "Framework/Requests/UpdateSink.h"
+#include "Providers/SoftwareUpdate/ImageVerification.h"
+
+class Quenx_ConcreteJob;
+
+/// What the front's sink is told of one call that installs: collected on the call's thread, and told when the
+/// update begins or the call is answered. Without a sink nothing is collected.
+class UpdateReport {
+  public:
+    UpdateReport();
+    ~UpdateReport();
+    UpdateReport(const UpdateReport&) = delete;
+    UpdateReport& operator=(const UpdateReport&) = delete;
+
+    /// The method returns this, or ends in an error; tells of a refusal.
+    void answered(unsigned int returnValue) noexcept;
+    void failed(const char* error) noexcept;
+
+    // What others on the way learn. Outside a call that installs, these do nothing. What there is no memory
+    // for is left out.
+
+    static void noteOrder(const UpdateOrder& order, const core::CimPath& target) noexcept;
+    /// Why the call is refused, in words; the first reason counts.
+    static void noteReason(std::string_view text) noexcept;
+    /// Looks at the bytes of an image while a scope prepares it.
+    class Examination {
+      public:
+        explicit Examination(std::span<const std::uint8_t> file);
+        /// Waits for the result.
+        ~Examination();
+        Examination(const Examination&) = delete;
+        Examination& operator=(const Examination&) = delete;
+
+      private:
+        std::future<core::ImageFacts> m_facts;
+    };
+    /// The job is about to start, and gets its record, outside a call or without a sink none. False where
+    /// the policy requires one that cannot be written: the job must not start.
+    static bool begin(Quenx_ConcreteJob& job);
+    /// Whether the policy lets an update begin: not where it requires a history that cannot be written. The
+    /// log has the reason then.
+    static bool mayBegin();
+
+  private:
+    void tell(unsigned int returnValue) noexcept;
+
+    core::UpdateSink* const m_sink;
+    core::UpdateAttempt m_attempt;
+    std::string m_reason;
+    bool m_hasBegun = false;
+};
+
+/// Carries out a call that installs, and reports it.
+template <class Call>
+unsigned int reported(Call&& call) {
+    UpdateReport report;
+    try {
+        const unsigned int returnValue = call();
+        report.answered(returnValue);
+        return returnValue;
+    } catch (const std::exception& error) {
+        report.failed(error.what());
+        throw;
+    }
+}

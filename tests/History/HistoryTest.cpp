@@ -1,0 +1,250 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "History/History.h"
+
+#include <gmock/gmock.h>
+#include <sys/resource.h>
+#include <sys/stat.h>
+#include <sys/wait.h>
+
+#include <algorithm>
+#include <csignal>
+#include <filesystem>
+#include <optional>
+
+#include "Providers/SoftwareUpdate/HookedBackend.h"
+#include "Support/SimulatedAdapters.h"
+#include "Support/SyslogCapture.h"
+#include "Utils/Os/Linux/linux.h"
+
+namespace {
+
+using history::History;
+using history::Record;
+using ::testing::HasSubstr;
+
+/// The adapters of SimulatedAdapters.h, one of which is at 43 % of an update.
+class Adapters : public test::HookedBackend {
+  public:
+    using HookedBackend::HookedBackend;
+    std::uint16_t getFlashImageUpdateProgress(const std::string&) override { return 43; }
+};
+
+class HistoryTest : public ::testing::Test {
+  protected:
+    HistoryTest() : m_backend(std::make_shared<Adapters>(ma::setBackend(nullptr))) {
+        ma::setBackend(m_backend);
+    }
+
+    history::Settings settings() const {
+        return {.folder = [this] { return m_path; }};
+    }
+    static core::UpdateAttempt attempt() {
+        return {.caller = {"alice", "192.0.2.1", "test"},
+                .time = os::getuSecondsSinceEpoch(),
+                .monotonic = os::getMonotonicuSeconds(),
+                .target = "port",
+                .adapter = "eth0",
+                .uri = "file:///new.rom",
+                .options = {5, 3},
+                .values = {},
+                .image = {"abc", 3, "IMG_PXE 2"},
+                .mostRecords = 100};
+    }
+    static void update(History& history) {
+        const auto record = history.begin(attempt());
+        ASSERT_NE(record, nullptr);
+        record->end(true, 0, "");
+    }
+    std::vector<Record> records() const { return History(settings()).find({}); }
+
+    const test::LogLevelGuard m_logLevel{1};
+    const test::SyslogCapture m_log;
+    const test::TempFolder m_folder;
+    const std::string m_path = m_folder / "history";
+    const std::string m_file = m_path + "/history.db";
+    const test::SimulatedAdapters m_adapters;
+    const std::shared_ptr<Adapters> m_backend;
+};
+
+TEST_F(HistoryTest, KeepsARefusalAndAnUpdateForThisUserAlone) {
+    {
+        History history(settings());
+        history.refused(attempt(), 5, "it was wrong");
+        update(history);
+        const auto given = history.begin(attempt());  // and no end
+    }
+    const std::vector<Record> found = records();
+    ASSERT_EQ(found.size(), 3U);
+    const Record& refused = found[2];
+    EXPECT_EQ(refused.outcome + ", " + refused.reason, "refused, it was wrong");
+    EXPECT_EQ(refused.returnValue, 5);
+    const Record& written = found[1];
+    EXPECT_EQ(written.outcome, "written");
+    EXPECT_EQ(written.user + " " + written.address + " " + written.front, "alice 192.0.2.1 test");
+    EXPECT_EQ(written.adapter + " " + written.pciAddress + " " + written.uri,
+              "eth0 0000:03:00.0 file:///new.rom");
+    EXPECT_EQ(written.versionsBefore + " / " + written.imageVersions, "IMG_PXE 1, IMG_UEFI 0 / IMG_PXE 2");
+    EXPECT_EQ(written.sha256 + " " + written.options, "abc 5,3");
+    EXPECT_TRUE(written.active && written.ended && written.duration);
+    EXPECT_EQ(found[0].reason, "The update did not take place");
+    for (const auto& [path, mode] : {std::pair{m_path, 0700U}, {m_file, 0600U}, {m_path + "/lock", 0600U}}) {
+        struct stat status {};
+        EXPECT_EQ(::stat(path.c_str(), &status), 0) << path;
+        EXPECT_EQ(status.st_mode & 0777U, mode) << path;
+    }
+}
+
+TEST_F(HistoryTest, CompletesWhatAKilledProcessBeganAndNoOther) {
+    const pid_t child = ::fork();
+    History history(settings());
+    const auto goesOn = history.begin(attempt());
+    if (child == 0) {
+        ::pause();
+        ::_exit(0);
+    }
+    const auto bothAreSeen = [&] {
+        const std::vector<Record> found = history.find({});
+        return found.size() == 2 && found[0].percent == 43 && found[1].percent == 43;
+    };
+    while (!bothAreSeen())
+        ::usleep(20'000);
+    ::kill(child, SIGKILL);
+    ::waitpid(child, nullptr, 0);
+    std::vector<Record> found = records();
+    ASSERT_EQ(found.size(), 2U);
+    std::ranges::sort(found, {}, [&](const Record& each) { return each.process == child; });
+    EXPECT_TRUE(found[0].isRunning());
+    EXPECT_EQ(found[1].outcome, "interrupted");
+    EXPECT_EQ(found[1].reason, "Interrupted at 43 %: test (process " + std::to_string(child) +
+                                   ") ended during the update. eth0 still has IMG_PXE 1, IMG_UEFI 0");
+    goesOn->end(false, 6, "broken");
+    EXPECT_EQ(history.find({.adapter = "0000:03:00.0", .after = found[0].id - 1}).at(0).outcome, "failed");
+}
+
+TEST_F(HistoryTest, DoesNotCrossAFork) {
+    History history(settings());
+    update(history);
+    const pid_t child = ::fork();
+    if (child == 0) ::_exit(history.begin(attempt()) == nullptr ? 0 : 1);
+    int status = -1;
+    ::waitpid(child, &status, 0);
+    EXPECT_EQ(status, 0);
+}
+
+TEST_F(HistoryTest, TakesTheRecordsOfTwoProcessesAndRemovesTheOldest) {
+    constexpr int kEach = 60;
+    const pid_t child = ::fork();
+    std::optional<History> history(settings());
+    for (int i = 0; i < kEach; ++i)
+        history->refused(attempt(), 2, child == 0 ? "child" : "parent");
+    if (child == 0) {
+        history.reset();
+        ::_exit(0);
+    }
+    ::waitpid(child, nullptr, 0);
+    for (int i = 0; i < 2; ++i)
+        history->refused(attempt(), 2, "parent");
+    const std::vector<Record> found = history->find({});
+    // Whenever there are more than a hundred, two go.
+    EXPECT_EQ(found.front().id, 2 * kEach + 2);
+    EXPECT_GE(found.size(), 99U);
+    EXPECT_LE(found.size(), 100U);
+    EXPECT_TRUE(test::SyslogCapture::contains("operation=\"PruneHistory\" target=\"" + m_path + "\""));
+    EXPECT_EQ(history->find({.failedOnly = true, .most = 7}).size(), 7U);
+}
+
+TEST_F(HistoryTest, NotesWhenTheNewFirmwareRuns) {
+    ma::NamedVersion version{.name = "fw", .running = "1.1", .stored = "1.1"};
+    m_backend->told = [&](const std::string&, ma::AdapterInfo& info) {
+        info.versions = {version};
+        info.resetNeeded = version.isPending() ? ma::ResetNeeded::Reboot : ma::ResetNeeded::None;
+    };
+    History history(settings());
+    const auto record = history.begin(attempt());
+    version.stored = "1.2";
+    record->end(true, 0, "");
+    Record found = history.find({}).at(0);
+    EXPECT_EQ(found.versionsBefore + " -> " + found.versionsAfter, "fw 1.1 -> fw 1.2");
+    EXPECT_FALSE(found.active);
+    version.running = "1.2";
+    found = history.find({}).at(0);
+    EXPECT_EQ(found.outcome, "written");
+    EXPECT_TRUE(found.active);
+}
+
+/// What is wrong with the history, and what the log says once.
+struct Trouble {
+    const char* name;
+    void (*make)(const std::string& file);
+    const char* said;
+    std::size_t recordsAfter;  ///< that can be read after one update
+};
+
+class TroubledHistoryTest : public HistoryTest, public ::testing::WithParamInterface<Trouble> {};
+
+TEST_P(TroubledHistoryTest, StopsNoUpdateAndIsToldOnce) {
+    {
+        History history(settings());
+        update(history);
+    }
+    GetParam().make(m_file);
+    {
+        History history(settings());
+        update(history);
+        history.refused(attempt(), 2, "again");
+    }
+    EXPECT_EQ(test::SyslogCapture::count(GetParam().said), 1U);
+    if (GetParam().recordsAfter == 0) {
+        EXPECT_THROW(records(), history::HistoryError);
+    } else {
+        EXPECT_EQ(records().size(), GetParam().recordsAfter);
+    }
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    All, TroubledHistoryTest,
+    ::testing::Values(
+        Trouble{"Damaged", [](const std::string& file) { std::filesystem::resize_file(file, 5000); },
+                "has been moved to ", 2},
+        Trouble{"NoDatabase",
+                [](const std::string& file) {
+                    std::filesystem::resize_file(file, 0);
+                    std::filesystem::resize_file(file, 5000);
+                },
+                "has been moved to ", 2},
+        Trouble{"Newer",
+                [](const std::string& file) { history::Database(file).execute("PRAGMA user_version = 9"); },
+                "written by a newer version (schema 9; this one knows 1)", 0},
+        Trouble{"Link",
+                [](const std::string& file) {
+                    std::filesystem::rename(file, file + ".elsewhere");
+                    std::filesystem::create_symlink(file + ".elsewhere", file);
+                },
+                "it is a link, or no regular file; remove it", 0}),
+    [](const auto& each) { return each.param.name; });
+
+TEST_F(HistoryTest, KeepsAnUpdateWholeThatBeganWhileTheDiskWasFull) {
+    History history(settings());
+    history.refused(attempt(), 2, "before");
+    rlimit limit{};
+    ::getrlimit(RLIMIT_FSIZE, &limit);
+    const rlimit full{0, limit.rlim_max};
+    const auto handler = std::signal(SIGXFSZ, SIG_IGN);
+    ::setrlimit(RLIMIT_FSIZE, &full);
+    const auto record = history.begin(attempt());
+    history.refused(attempt(), 2, "lost");
+    core::UpdateAttempt required = attempt();
+    required.mustBeKept = true;
+    EXPECT_EQ(history.begin(required), nullptr);
+    EXPECT_NE(history.problem(), "");
+    ::setrlimit(RLIMIT_FSIZE, &limit);
+    std::signal(SIGXFSZ, handler);
+    record->end(true, 0, "");
+    EXPECT_EQ(history.problem(), "");
+    const std::vector<Record> found = history.find({});
+    ASSERT_EQ(found.size(), 2U);
+    EXPECT_EQ(found[0].outcome, "written");
+    EXPECT_EQ(test::SyslogCapture::count("No record is kept of updates"), 1U);
+}
+
+}  // namespace

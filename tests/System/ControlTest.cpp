@@ -1,0 +1,185 @@
+// SPDX-License-Identifier: Apache-2.0
+// What the daemon serves beside CIM-XML: who holds an adapter, checks that hold none, images that are sent.
+#include <gmock/gmock.h>
+
+#include <filesystem>
+#include <regex>
+
+#include "Control/Sha256.h"
+#include "System/RawConnection.h"
+#include "System/RunningDaemon.h"
+
+namespace {
+
+using test::RawConnection;
+using ::testing::HasSubstr;
+
+constexpr const char* kAdmin = "Authorization: Basic YWRtaW46YWRtaW4=";
+constexpr const char* kGuest = "Authorization: Basic Z3Vlc3Q6Z3Vlc3Q=";
+
+/// The path that wbemcli prints, as XML.
+std::string nameOf(const std::string& path) {
+    static const std::regex kKey("(\\w+)=\"([^\"]*)\"");
+    std::string xml = "<INSTANCENAME CLASSNAME=\"" + path.substr(0, path.find('.')) + "\">";
+    for (std::sregex_iterator each(path.begin(), path.end(), kKey), end; each != end; ++each)
+        xml += "<KEYBINDING NAME=\"" + (*each)[1].str() + "\"><KEYVALUE>" + (*each)[2].str() +
+               "</KEYVALUE></KEYBINDING>";
+    return xml + "</INSTANCENAME>";
+}
+
+std::string sumOf(const std::string& bytes) {
+    control::Sha256 hash;
+    hash.add(bytes.data(), bytes.size());
+    return hash.take();
+}
+
+class ControlTest : public ::testing::Test {
+  protected:
+    ControlTest() { std::filesystem::create_directory(m_daemon.folder() / "firmware"); }
+
+    /// An answer to bytes, by a connection of its own.
+    std::string answerTo(const std::string& bytes) const {
+        const RawConnection connection(m_daemon.httpPort(), "127.0.0.1");
+        connection.send(bytes);
+        connection.endSending();
+        return connection.receive();
+    }
+    std::string put(const std::string& place, const std::string& sum, const std::string& body,
+                    const std::string& login = kAdmin, std::size_t more = 0) const {
+        return answerTo("PUT /quenx/v1/images/" + place + " HTTP/1.1\r\nHost: localhost\r\nQuenx-SHA256: " +
+                        sum + "\r\nConnection: close\r\n" + login +
+                        "\r\nContent-Length: " + std::to_string(body.size() + more) + "\r\n\r\n" + body);
+    }
+    test::ProgramResult remote(const std::string& line) const {
+        return test::run({"/bin/sh", "-c", "exec quenxctl --server http://127.0.0.1:$0 --user admin " + line,
+                          std::to_string(m_daemon.httpPort())},
+                         {"PATH=" QUENX_PROGRAMS ":/usr/bin:/bin", "QUENXCTL_PASSWORD=admin"});
+    }
+    std::size_t files() const {
+        std::size_t count = 0;
+        for (const auto& each : std::filesystem::recursive_directory_iterator(m_daemon.folder() / "images"))
+            if (each.is_regular_file()) ++count;
+        return count;
+    }
+
+    test::RunningDaemon m_daemon{{"--uploads-image-bytes", "200000", "--uploads-total-bytes", "300000"},
+                                 {"QUENX_LOG=stderr"}};
+};
+
+/// CheckSoftwareIdentity, as a client sends it that knows no more than the model.
+class ClaimTest : public ControlTest, public ::testing::WithParamInterface<bool> {
+  protected:
+    ClaimTest() {
+        const test::TempFolder& folder = m_daemon.folder();
+        std::filesystem::copy(m_daemon.image(), folder / "firmware");
+        folder.write("provider.conf", "FWFilePath=" + folder.path() + "/firmware\n");
+        if (GetParam()) folder.write("policy.toml", "release_claim_after_check = true\n");
+    }
+    /// The path of the instance that has this in it.
+    std::string pathOf(const std::string& className, const std::string& part) const {
+        for (const std::string& path : m_daemon.lines("ein", className))
+            if (test::contains(path, part)) return nameOf(path);
+        return "";
+    }
+    /// Its return value.
+    std::string check(const std::string& adapter) const {
+        const auto argument = [](const std::string& name, const std::string& path) {
+            return "<PARAMVALUE NAME=\"" + name + "\"><VALUE.REFERENCE>" + path +
+                   "</VALUE.REFERENCE></PARAMVALUE>";
+        };
+        const std::string answer = answerTo(test::httpRequest(
+            "<?xml version=\"1.0\"?><CIM CIMVERSION=\"2.0\" DTDVERSION=\"2.0\"><MESSAGE ID=\"1\" "
+            "PROTOCOLVERSION=\"1.0\"><SIMPLEREQ><METHODCALL "
+            "NAME=\"CheckSoftwareIdentity\"><LOCALINSTANCEPATH>"
+            "<LOCALNAMESPACEPATH><NAMESPACE NAME=\"root\"/><NAMESPACE NAME=\"cimv2\"/></LOCALNAMESPACEPATH>" +
+            pathOf("Quenx_SoftwareInstallationService", "") + "</LOCALINSTANCEPATH>" +
+            argument("Source", pathOf("Quenx_SoftwareIdentity", "Quenx:1af4-")) +
+            argument("Target", pathOf("Quenx_EthernetPort", adapter)) +
+            "</METHODCALL></SIMPLEREQ></MESSAGE></CIM>"));
+        const std::size_t from = answer.find("<VALUE>", answer.find("<RETURNVALUE")) + 7;
+        return answer.substr(from, answer.find('<', from) - from);
+    }
+};
+
+TEST_P(ClaimTest, OfACheckStaysUntilItIsFreedUnlessThePolicyGivesItBack) {
+    EXPECT_EQ(check("eth0"), "0");
+    EXPECT_EQ(check("eth1"), GetParam() ? "0" : "2");
+    const std::string install = "install --target eth0 " + m_daemon.image();
+    if (!GetParam()) {
+        const test::ProgramResult refused = remote(install + " --force");
+        EXPECT_EQ(refused.status, 1);
+        EXPECT_THAT(refused.error, HasSubstr("eth0 is held by a check of admin, which has ended.\n"
+                                             "Free it with \"quenxctl release eth0\""));
+        EXPECT_THAT(remote("status").out, HasSubstr("\neth0 (simulated)  a check of admin  20"));
+        EXPECT_EQ(remote("release eth1").out, "eth1 was not held.\n");
+        EXPECT_EQ(remote("release 0000:03:00.0").out, "eth0 is free again.\n");
+    }
+    EXPECT_EQ(remote(install).status, 0);
+    EXPECT_THAT(remote("status").out,
+                HasSubstr("\neth0 (simulated)  -        -      -    Completed (Quenx:"));
+    const std::string lines = m_daemon.stop().out;
+    const std::string freed = "operation=\"ReleaseClaim\" target=\"eth0\" arguments=\"\" outcome=\"done\"";
+    EXPECT_EQ(test::contains(lines, freed), !GetParam()) << lines;
+}
+
+INSTANTIATE_TEST_SUITE_P(Policy, ClaimTest, ::testing::Bool());
+
+TEST_F(ControlTest, RefusesWhatIsNoUpload) {
+    const std::string body(1000, 'x');
+    const std::string sum = sumOf(body);
+    const struct {
+        std::string what, place, sum, body, login, text;
+        int status;
+        std::size_t more = 0;
+    } rows[] = {{"wrong sum", sum + "/a", sumOf("y"), body, kAdmin, "did not arrive as it was sent", 422},
+                {"no sum", sum + "/a", "5", body, kAdmin, "has to hold the SHA-256", 400},
+                {"a name with a slash", sum + "/../a", sum, body, kAdmin, "is no name for an image", 400},
+                {"the same, hidden", sum + "/..%2Fa", sum, body, kAdmin, "is no name for an image", 400},
+                {"a hidden file", sum + "/.a", sum, body, kAdmin, "is no name for an image", 400},
+                {"no folder", "a", sum, body, kAdmin, "a slash and its name", 400},
+                {"too large", sum + "/a", sum, std::string(200001, 'x'), kAdmin, "uploads.image_bytes", 413},
+                {"empty", sum + "/a", sum, "", kAdmin, "is empty", 400},
+                {"not an administrator", sum + "/a", sum, body, kGuest, "may only read", 403},
+                {"nobody", sum + "/a", sum, body, "X: y", "", 401},
+                {"cut off", sum + "/a", sum, body, kAdmin, "", 0, 1}};
+    std::filesystem::create_directory(m_daemon.folder() / "images");
+    for (const auto& row : rows) {
+        const std::string answer = put(row.place, row.sum, row.body, row.login, row.more);
+        EXPECT_EQ(test::statusOf(answer), row.status) << row.what;
+        EXPECT_THAT(answer, HasSubstr(row.text)) << row.what;
+        EXPECT_EQ(files(), 0U) << row.what;
+    }
+    m_daemon.folder().write("policy.toml", "administrators = []\n");
+    EXPECT_EQ(test::statusOf(put(sum + "/a", sum, body)), 403);
+}
+
+TEST_F(ControlTest, MakesRoomByTheOldestUpload) {
+    const auto send = [this](char c) {
+        const std::string body(120000, c);
+        return test::statusOf(put(sumOf(body) + "/new.rom", sumOf(body), body));
+    };
+    for (const char c : {'a', 'b', 'b'})
+        EXPECT_EQ(send(c), 200);
+    EXPECT_EQ(files(), 2U) << "the same image is there once";
+    EXPECT_EQ(send('c'), 200);
+    EXPECT_EQ(files(), 2U);
+    EXPECT_FALSE(std::filesystem::exists(m_daemon.folder() / "images/" + sumOf(std::string(120000, 'a'))));
+}
+
+TEST(FullDiskTest, RefusesAnUploadAndLosesNothing) {
+    // No file of the daemon's may grow beyond this.
+    const test::RunningDaemon daemon({}, {}, {"/usr/bin/prlimit", "--fsize=400000"});
+    const std::string image = daemon.folder().write("large.rom", std::string(400001, 'x'));
+    const auto send = [&](const std::string& file) {
+        return test::run({QUENXCTL, "--server", "http://127.0.0.1:" + std::to_string(daemon.httpPort()),
+                          "--user", "admin", "install", "--force", "--target", "eth0", "--upload", file},
+                         {"QUENXCTL_PASSWORD=admin"});
+    };
+    EXPECT_EQ(send(daemon.image()).status, 0);
+    const test::ProgramResult refused = send(image);
+    EXPECT_EQ(refused.status, 1);
+    EXPECT_THAT(refused.error, HasSubstr("there is no room for the file below "));
+    EXPECT_THAT(daemon.lines("ein", "Quenx_SoftwareIdentityResource"), ::testing::SizeIs(1));
+}
+
+}  // namespace
