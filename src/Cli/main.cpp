@@ -13,7 +13,7 @@
 #include <string_view>
 #include <thread>
 
-#include "Cli/Arguments.h"
+#include "Cli/Arguments/Arguments.h"
 #include "Cli/Display/Output.h"
 #include "Framework/Requests/PolicyDecision.h"
 #include "Utils/Os/Linux/linux.h"

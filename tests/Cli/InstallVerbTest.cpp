@@ -7,8 +7,10 @@
 #include <sstream>
 
 #include "Cli/Update/Card.h"
+#include "Cli/Update/Targets.h"
 #include "Cli/Verbs/Verbs.h"
 #include "Framework/Requests/CimRequests.h"
+#include "History/History.h"
 #include "MidAPI/Simulator/Simulator.h"
 #include "MidAPI/ma.h"
 #include "Support/TempFolder.h"
@@ -62,11 +64,13 @@ class FakeService : public core::CimRequests {
     bool isReadable = true;  ///< what is installed, after the job
     std::string resetNeeded = "None";
     std::string updateState;
+    Instances images;           ///< of the inventory, with where they are
     std::uint32_t refusal = 0;  ///< what the service answers in place of a job
 
     FakeService() : CimRequests("") {}
     Instances enumerateInstances(const std::string& className, const PropertyFilter&) override {
         if (className == "Quenx_ConcreteJob") return {jobs.begin(), jobs.end()};
+        if (className.starts_with("Quenx_SoftwareIdentity")) return images;
         if (className != "Quenx_EthernetPort") return {};
         return {{CimPath("Quenx_EthernetPort.DeviceID=\"eth0\""),
                  {{"Name", CimValue::of(CimType::String, std::string("eth0")), false, {}},
@@ -114,13 +118,17 @@ class CardStub : public ma::Simulator {
     ma::ImageVerdict verdict;
     ma::ResetNeeded needed = ma::ResetNeeded::Reload;
     ma::Activation activation;
-    bool mayDisrupt = false;  ///< as it was asked for
+    bool mayDisrupt = false;      ///< as it was asked for
+    std::uint32_t installed = 1;  ///< version of IMG_PXE
 
     std::optional<ma::ImageVerdict> judgeImage(const std::string&, std::span<const std::uint8_t>,
                                                const std::vector<utils::FirmwareType>&) override {
         return verdict;
     }
-    ma::AdapterInfo getAdapterInfo(const std::string&) override { return {.resetNeeded = needed}; }
+    utils::PCIAddr getPCIAddress(const std::string&) override { return {}; }
+    ma::AdapterInfo getAdapterInfo(const std::string&) override {
+        return {.components = {{utils::FirmwareType::PXE, installed}}, .resetNeeded = needed};
+    }
     ma::CardUse getCardUse(const std::string&, const std::string&) override {
         return {.functions = {"eth0", "eth1"}, .interfaces = {"enp1s0"}, .bridges = {"br0"}};
     }
@@ -139,7 +147,7 @@ class InstallVerbTest : public ::testing::Test {
         for (std::ostringstream* stream : {&m_out, &m_error, &m_lines})
             stream->str("");
         const cli::Connection connection{
-            .operations = m_service, .isInProcess = isInProcess, .sharesFiles = true};
+            .operations = m_service, .history = m_history, .isInProcess = isInProcess, .sharesFiles = true};
         cli::LinePrinter printer(m_lines, {});
         cli::ProgressDisplay progress(printer, [] { return std::chrono::steady_clock::time_point(); });
         cli::Context context{
@@ -148,11 +156,14 @@ class InstallVerbTest : public ::testing::Test {
             .error = m_error,
             .json = false,
             .progress = progress,
-            .following = {.pause = [] {}, .interrupted = [this] { return m_isInterrupted; }}};
+            .following = {.pause = [] {}, .interrupted = [this] { return m_isInterrupted; }},
+            .ask = [this](const std::string&, const std::function<bool()>&) { return m_answer; }};
         cli::VerbOptions options;
         options.mayDisrupt = m_mayDisrupt;
         options.update.target = "eth0";
         options.update.image = m_file;
+        options.update.force = m_isForced;
+        options.many = m_many;
         return verb(context, options);
     }
     ExitStatus install() { return run(cli::install, true); }
@@ -166,6 +177,10 @@ class InstallVerbTest : public ::testing::Test {
     std::ostringstream m_lines;
     bool m_isInterrupted = false;
     bool m_mayDisrupt = false;
+    cli::ManyOptions m_many;
+    std::shared_ptr<history::History> m_history;
+    bool m_isForced = false;
+    std::optional<std::string> m_answer;  ///< of the user
 };
 
 ExitStatus showPending(cli::Context& context, const cli::VerbOptions&) {
@@ -190,6 +205,21 @@ TEST_F(InstallVerbTest, FollowsTheJobOverABrokenConnection) {
               "eth0: 0 %, 0 B of 2.0 KiB\neth0: 40 %, 819 B of 2.0 KiB\neth0: 100 %, 2.0 KiB of 2.0 KiB\n");
     EXPECT_EQ(m_out.str(), kUpdated);
     EXPECT_EQ(m_error.str(), "");
+}
+
+TEST_F(InstallVerbTest, SaysBeforeACheckThatAServerMayHoldTheAdapter) {
+    const auto text = [](const std::string& name, const std::string& value) {
+        return core::PropertyValue{name, CimValue::of(CimType::String, value), false, {}};
+    };
+    m_service->images = {{CimPath("Quenx_SoftwareIdentity.InstanceID=\"i\""), {text("InstanceID", "i")}},
+                         {CimPath("Quenx_SoftwareIdentityResource.InstanceID=\"i@\""),
+                          {text("InstanceID", "i@"), text("AccessInfo", "file://" + m_file)}}};
+    m_service->needsJob = false;
+    EXPECT_EQ(run(cli::check, false), ExitStatus::Done);
+    EXPECT_TRUE(
+        m_error.str().starts_with("quenxctl: Warning: This server can check an image only by holding eth0: "))
+        << m_error.str();
+    EXPECT_EQ(m_out.str(), "The image can be installed on eth0.\n");
 }
 
 TEST_F(InstallVerbTest, CallsNothingAFailureWhoseOutcomeItDoesNotKnow) {
@@ -359,6 +389,112 @@ TEST_F(CardVerbTest, RefusesAnImageInTheWordsOfItsBackend) {
     EXPECT_EQ(m_error.str(), "quenxctl: eth0 does not take " + m_file +
                                  ": the package is for PCI device 8086:1592.\nGet the image made for "
                                  "1af4:1041.\n");
+}
+
+TEST_F(CardVerbTest, WritesToManyOnlyWhatIsKnownToBeNew) {
+    const ma::ImageVerdict other{.isForCard = true, .versions = {{"IMG_PXE", "1", "2"}}};
+    const ma::ImageVerdict same{.isForCard = true, .versions = {{"IMG_PXE", "2", "2"}}};
+    const ma::ImageVerdict opaque{.unchecked = {"which card the file is for"}};
+    const ma::ImageVerdict older{
+        .status = ma::ImageIsOlder, .reason = "older", .versions = {{"fw", "3", "2"}}};
+    const ma::ImageVerdict foreign{.status = ma::ImageNotSupported, .reason = "the package is for 8086:1592"};
+    struct Row {
+        ma::ImageVerdict verdict;
+        std::string resetNeeded;
+        std::uint32_t refusal;
+        bool isFit, isForced;
+        std::string outcome;
+        ExitStatus status;
+        bool isCalled;
+    };
+    const Row table[] = {
+        {other, "None", 0, true, false, "updated", ExitStatus::Done, true},
+        {other, "Reboot", 0, false, false, "updated-reset-pending", ExitStatus::Done, true},
+        {other, "None", 6, true, false, "refused", ExitStatus::Failed, true},
+        // Before the reset and after it.
+        {same, "Reboot", 0, true, false, "current", ExitStatus::AlreadyCurrent, false},
+        {same, "None", 0, true, true, "updated", ExitStatus::Done, true},
+        {opaque, "None", 0, true, false, "unknown", ExitStatus::Unknown, false},
+        {opaque, "None", 0, false, true, "updated", ExitStatus::Done, true},
+        {older, "None", 4099, false, false, "refused", ExitStatus::Failed, true},
+        {foreign, "None", 4097, false, false, "refused", ExitStatus::Failed, true},
+        {foreign, "None", 4097, true, false, "fits no adapter here", ExitStatus::AlreadyCurrent, false},
+    };
+    m_answer = "y";
+    for (const Row& row : table) {
+        m_card->verdict = row.verdict;
+        m_service->resetNeeded = row.resetNeeded;
+        m_service->refusal = row.refusal;
+        m_service->isCalled = false;
+        m_service->jobs = {job(7, 100)};
+        m_many = {.isAll = !row.isFit, .isFit = row.isFit, .images = {m_file}};
+        m_isForced = row.isForced;
+        EXPECT_EQ(install(), row.status) << row.outcome;
+        EXPECT_NE(m_out.str().find(row.outcome), std::string::npos) << row.outcome << m_out.str();
+        EXPECT_EQ(m_service->isCalled, row.isCalled) << row.outcome;
+    }
+}
+
+TEST_F(CardVerbTest, TakesTheWordOfTheHistoryForAnImageThatTellsNoVersion) {
+    m_card->verdict.unchecked = {"which card the file is for"};
+    m_card->needed = ma::ResetNeeded::None;
+    m_history = std::make_shared<history::History>(
+        history::Settings{[folder = m_folder / "history"] { return folder; }});
+    const auto bytes = test::readTestFile(m_file);
+    core::UpdateAttempt attempt;
+    attempt.adapter = "eth0";
+    attempt.image = m_history->examine(bytes).get();
+    m_history->begin(attempt)->end(true, 0, "");
+    m_many = {.isFit = true, .images = {m_file}};
+    EXPECT_EQ(install(), ExitStatus::AlreadyCurrent) << m_error.str();
+    // Another file, other types, and something else in the flash than the update has left there.
+    m_many.images = {m_folder.write("other.rom", std::vector<std::uint8_t>(bytes.size()))};
+    EXPECT_EQ(install(), ExitStatus::Unknown);
+    m_many.images = {m_file};
+    m_card->installed = 2;
+    EXPECT_EQ(install(), ExitStatus::Unknown);
+    m_card->installed = 1;
+    attempt.values = {"IMG_PXE"};
+    m_history->begin(attempt)->end(true, 0, "");
+    EXPECT_EQ(install(), ExitStatus::Unknown);
+    EXPECT_FALSE(m_service->isCalled);
+}
+
+TEST_F(CardVerbTest, WritesToManyHardwareAdaptersOnlyWhenTheyAreMeant) {
+    m_card->verdict = {.isForCard = true, .versions = {{"fw", "1", "2"}}};
+    m_many = {.isAll = true, .images = {m_file}};
+    for (const auto& answer : {std::optional<std::string>(), {"n"}, {""}}) {
+        m_answer = answer;
+        EXPECT_THROW(install(), cli::CommandError);
+        EXPECT_FALSE(m_service->isCalled);
+    }
+    m_many.isDryRun = true;
+    EXPECT_EQ(run(cli::install, false), ExitStatus::Done);
+    EXPECT_FALSE(m_service->isCalled);
+    m_many.isDryRun = false;
+    m_many.isConfirmed = true;
+    m_isInterrupted = true;
+    EXPECT_EQ(install(), ExitStatus::Interrupted);
+    EXPECT_FALSE(m_service->isCalled);
+    m_isInterrupted = false;
+    EXPECT_EQ(install(), ExitStatus::Done);
+}
+
+TEST(CardOfTest, IsTheSameForTheFunctionsOfACard) {
+    const auto card = [](const char* board, const char* serial, const char* address) {
+        cli::Adapter adapter;
+        adapter.name = "eth0";
+        adapter.boardSerialNumber = board;
+        adapter.serialNumber = serial;
+        adapter.pciAddress = address;
+        return cli::cardOf(adapter);
+    };
+    EXPECT_EQ(card("B", "1", "05:00.0"), card("B", "2", "06:00.0"));
+    EXPECT_EQ(card("", "S", "05:00.0"), card("", "S", "05:01.0"));
+    EXPECT_NE(card("", "S", "05:00.0"), card("", "T", "05:00.1"));
+    EXPECT_EQ(card("", "", "05:00.0"), card("", "", "05:00.1"));
+    EXPECT_NE(card("", "", "05:00.0"), card("", "", "0001:05:00.0"));
+    EXPECT_EQ(card("", "", ""), "adapter eth0");
 }
 
 TEST_F(CardVerbTest, ActivatesWhatWaitsAndTellsHowThatEnded) {

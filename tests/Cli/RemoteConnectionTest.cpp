@@ -9,6 +9,7 @@
 #include <thread>
 
 #include "Cli/Connection/Connection.h"
+#include "Cli/Connection/ServerControl.h"
 #include "Host/UnixSocket.h"
 #include "Support/TempFolder.h"
 
@@ -107,6 +108,8 @@ TEST(RemoteConnectionTest, TakesNoAnswerForAnotherRequestsOrForNothing) {
          "The server's answer cannot be read: element METHODRESPONSE has no RETURNVALUE."}};
     for (const auto& row : table)
         EXPECT_THAT([&] { call(row.first); }, ThrowsMessage<cli::NoAnswer>(StrEq(row.second)));
+    EXPECT_FALSE(ToldServer(table[0].first).connect().control->checkImage("</CIM>", "", {}, {}))
+        << "a server that has only the model";
     const ToldServer server(message("1", "<METHODRESPONSE NAME='EnumerateInstanceNames'>" + returned));
     EXPECT_THROW(server.connect().operations->enumerateInstanceNames("Y"), cli::NoAnswer);
     const ToldServer confused(

@@ -54,6 +54,19 @@ TEST_F(InstallTest, WaitsForTheEndAfterCtrlC) {
     EXPECT_EQ(firmwareOf("eth0"), kNew);
 }
 
+TEST_F(InstallTest, FollowsAnotherProcess) {
+    HeldFlash flash(m_flash);
+    Program first(command(kInstall));
+    ASSERT_TRUE(flash.isWaitedFor());
+    Program second(command("install --match eth0 --follow IMAGE"), Program::Output::Terminal);
+    EXPECT_TRUE(second.waitFor("; waiting for the end of that."));
+    flash.release();
+    const ProgramResult followed = second.finish();
+    EXPECT_EQ(followed.status, 0);
+    EXPECT_TRUE(contains(followed.out, "was updated by an update that ran already.")) << followed.out;
+    EXPECT_EQ(first.finish().status, 0);
+}
+
 TEST_F(InstallTest, TellsAnOrdinaryUserWhatOnlyRootMaySee) {
     if (::geteuid() != 0) GTEST_SKIP() << "needs root, to become another user";
     EXPECT_EQ(quenxctl("install --target eth0 IMAGE").status, 0);

@@ -67,6 +67,22 @@ TEST_F(RemoteTest, LeavesAnUpdateToTheServerWhenInterrupted) {
     EXPECT_TRUE(contains(hung.out, "Interrupted before the update began: nothing was changed.")) << hung.out;
 }
 
+TEST_F(RemoteTest, FollowsTheUpdateThatALostConnectionHasLeft) {
+    test::HeldFlash held(m_flash);
+    Program first(command(kInstall));
+    ASSERT_TRUE(first.waitFor("eth0: 0 %"));
+    first.send(SIGINT);
+    EXPECT_EQ(first.finish().status, 6);
+    Program second(command("install --match eth0 --follow IMAGE"));
+    ASSERT_TRUE(second.waitFor("eth0: 0 %"));
+    held.release();
+    const ProgramResult followed = second.finish();
+    EXPECT_EQ(followed.status, 0) << followed.error;
+    EXPECT_TRUE(contains(followed.out, "eth0 (simulated) was updated by an update that ran already."))
+        << followed.out;
+    EXPECT_FALSE(contains(quenxctl("jobs").out, "Job#2"));
+}
+
 TEST_F(RemoteTest, AsksForThePasswordWithoutShowingIt) {
     Program program(command("adapters"), Program::Output::Terminal, {"QUENXCTL_PASSWORD"});
     ASSERT_TRUE(program.waitFor("Password for admin: "));

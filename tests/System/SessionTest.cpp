@@ -48,9 +48,10 @@ TEST_P(SessionTest, ShowsWhatIsWrittenDown) {
 }
 
 INSTANTIATE_TEST_SUITE_P(Shell, SessionTest,
-                         ::testing::Values("BadFiles", "CommandLine", "ConfigCheck", "Daemon", "Domains",
-                                           "Help", "Identities", "Install", "Json", "Policy", "Registration",
-                                           "Settings", "Staged", "UsersFile", "WrongImages"),
+                         ::testing::Values("Ansible", "BadFiles", "CommandLine", "ConfigCheck", "Daemon",
+                                           "Domains", "Help", "History", "Identities", "Install", "Json",
+                                           "Many", "Policy", "Registration", "Rollback", "Settings", "Staged",
+                                           "UsersFile", "WrongImages"),
                          [](const auto& session) { return session.param; });
 
 }  // namespace

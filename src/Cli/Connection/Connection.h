@@ -6,8 +6,10 @@
 #include <optional>
 #include <string>
 
+#include "Cli/Connection/RefusalSink.h"
 #include "Cli/Display/Messages.h"
 #include "Framework/Requests/CimOperations.h"
+#include "History/History.h"
 #include "MidAPI/AdapterTypes.h"
 
 namespace cli {
@@ -18,11 +20,16 @@ class NoAnswer : public CommandError {
     using CommandError::CommandError;
 };
 
+class ServerControl;
+
 /// The way to the management model: in this process, or over the wire. Used from one thread.
 struct Connection {
     /// Never null. Errors of the model are core::CimError; errors of the way itself are CommandError. Giving
     /// up the last copy unloads the providers of this process, which waits for the updates that have begun.
     std::shared_ptr<core::CimOperations> operations;
+    std::shared_ptr<history::History> history = {};  ///< of this process's adapters; null where none is kept
+    std::shared_ptr<const RefusalSink> refusals = {};  ///< of this process; null with a server
+    std::shared_ptr<ServerControl> control = {};       ///< of a server; null in process
     bool isInProcess = true;  ///< the providers run, and their jobs end, with this program
     bool sharesFiles = true;  ///< a path means the same file to this program as to the service
 };
@@ -84,6 +91,6 @@ struct ServerSettings {
 /// @param settings       with a URL
 /// @param isInterrupted  asked about once a second while an answer is waited for; true ends the request with
 ///                       a CommandError of ExitStatus::Interrupted
-Connection openServer(const ServerSettings& settings, std::function<bool()> isInterrupted);
+Connection openServer(const ServerSettings& settings, const std::function<bool()>& isInterrupted);
 
 }  // namespace cli

@@ -2,6 +2,7 @@
 #include "Cli/Connection/HttpClient.h"
 
 #include <arpa/inet.h>
+#include <unistd.h>
 
 #include <cstdlib>
 #include <limits>
@@ -9,13 +10,14 @@
 
 #include "CimXml/Request.h"
 #include "Cli/Display/Messages.h"
+#include "Control/Interface.h"
 #include "Utils/Utils.h"
 
 namespace cli {
 
 namespace {
 
-using UrlParts = std::unique_ptr<CURLU, decltype(&curl_url_cleanup)>;
+using UrlParts = std::unique_ptr<CURLU, decltype(CurlLibrary::urlCleanup)>;
 
 [[noreturn]] void refuseUrl(const std::string& text, const std::string& why) {
     // What stands before an @ may be a password.
@@ -27,9 +29,9 @@ using UrlParts = std::unique_ptr<CURLU, decltype(&curl_url_cleanup)>;
 /// Empty when the URL has no such part.
 std::string partOf(const UrlParts& url, CURLUPart part) {
     char* text = nullptr;
-    if (curl_url_get(url.get(), part, &text, 0) != CURLUE_OK) return {};
+    if (curl().urlGet(url.get(), part, &text, 0) != CURLUE_OK) return {};
     std::string result = text;
-    curl_free(text);
+    curl().free(text);
     return result;
 }
 
@@ -68,7 +70,20 @@ std::size_t takeHeader(char* data, std::size_t, std::size_t count, void* to) {
     };
     keep("CIMError", reply.cimError);
     keep("Retry-After", reply.retryAfter);
+    std::string version;
+    keep(control::kHeader, version);
+    if (!version.empty()) reply.isControl = true;
     return count;
+}
+
+std::size_t giveFile(char* to, std::size_t, std::size_t most, void* descriptor) {
+    const ssize_t got = ::read(*static_cast<const int*>(descriptor), to, most);
+    return got < 0 ? CURL_READFUNC_ABORT : static_cast<std::size_t>(got);
+}
+
+/// "https://host:5989"
+std::string rootOf(const std::string& url) {
+    return url.substr(0, url.find('/', url.find("://") + 3));
 }
 
 /// @param isEncrypted  whether the request was
@@ -146,10 +161,10 @@ ServerUrl::ServerUrl(const std::string& text) {
         return;
     }
     if (text.find("://") == std::string::npos) refuseUrl(text, "does not begin with https:// or http://");
-    const UrlParts url(curl_url(), curl_url_cleanup);
+    const UrlParts url(curl().url(), curl().urlCleanup);
     // Any scheme, so that a wrong one is refused in words that say which are right.
-    const CURLUcode error = curl_url_set(url.get(), CURLUPART_URL, text.c_str(), CURLU_NON_SUPPORT_SCHEME);
-    if (error != CURLUE_OK) refuseUrl(text, std::string("is not a URL: ") + curl_url_strerror(error));
+    const CURLUcode error = curl().urlSet(url.get(), CURLUPART_URL, text.c_str(), CURLU_NON_SUPPORT_SCHEME);
+    if (error != CURLUE_OK) refuseUrl(text, std::string("is not a URL: ") + curl().urlStrerror(error));
     const std::string scheme = partOf(url, CURLUPART_SCHEME);
     if (scheme != "https" && scheme != "http") refuseUrl(text, "does not begin with https:// or http://");
     if (!partOf(url, CURLUPART_USER).empty() || !partOf(url, CURLUPART_PASSWORD).empty()) {
@@ -160,16 +175,17 @@ ServerUrl::ServerUrl(const std::string& text) {
     m_isEncrypted = scheme == "https";
     // The ports that are registered for CIM-XML, and not those of the scheme.
     if (partOf(url, CURLUPART_PORT).empty())
-        curl_url_set(url.get(), CURLUPART_PORT, m_isEncrypted ? "5989" : "5988", 0);
-    if (partOf(url, CURLUPART_PATH) == "/") curl_url_set(url.get(), CURLUPART_PATH, "/cimom", 0);
+        curl().urlSet(url.get(), CURLUPART_PORT, m_isEncrypted ? "5989" : "5988", 0);
+    if (partOf(url, CURLUPART_PATH) == "/") curl().urlSet(url.get(), CURLUPART_PATH, "/cimom", 0);
     m_isLoopback = isLoopbackHost(partOf(url, CURLUPART_HOST));
     m_text = partOf(url, CURLUPART_URL);
 }
 
 HttpClient::HttpClient(const ServerSettings& settings, const std::string& user, const std::string& password,
                        std::function<bool()> isInterrupted)
-    : m_curl(curl_easy_init(), curl_easy_cleanup),
+    : m_curl(curl().easyInit(), curl().easyCleanup),
       m_url(settings.url->text()),
+      m_root(settings.url->socket().empty() ? rootOf(m_url) : "http://localhost"),
       m_isLocal(!settings.url->socket().empty()),
       m_namesCaFile(!settings.caFile.empty()),
       m_isInterrupted(std::move(isInterrupted)) {
@@ -181,7 +197,7 @@ HttpClient::HttpClient(const ServerSettings& settings, const std::string& user, 
     // An answer may have to wait for the verification of a large image.
     constexpr long kAnswerSeconds = 120;
     set(CURLOPT_ERRORBUFFER, m_error.data());
-    set(CURLOPT_URL, m_isLocal ? "http://localhost/cimom" : m_url.c_str());
+    set(CURLOPT_URL, m_isLocal ? (m_root + "/cimom").c_str() : m_url.c_str());
     if (m_isLocal) set(CURLOPT_UNIX_SOCKET_PATH, settings.url->socket().c_str());
     set(CURLOPT_PROTOCOLS_STR, "http,https");
     set(CURLOPT_NOSIGNAL, 1L);  // signals are this program's own business
@@ -213,21 +229,47 @@ HttpClient::HttpClient(const ServerSettings& settings, const std::string& user, 
 
 HttpReply HttpClient::post(const std::vector<std::string>& headers, const std::string& body,
                            Sending sending) {
-    HttpReply reply;
-    m_attempts = sending == Sending::Once ? 1 : std::numeric_limits<int>::max();
-    std::unique_ptr<curl_slist, decltype(&curl_slist_free_all)> list(nullptr, curl_slist_free_all);
-    for (const std::string& header : headers)
-        list.reset(curl_slist_append(list.release(), header.c_str()));
-    set(CURLOPT_HTTPHEADER, list.get());
-    // Neither the headers nor the body are copied: both outlive the transfer.
+    // The body is not copied: it outlives the transfer.
     set(CURLOPT_POSTFIELDS, body.c_str());
     set(CURLOPT_POSTFIELDSIZE_LARGE, static_cast<curl_off_t>(body.size()));
+    return perform(headers, sending);
+}
+
+HttpReply HttpClient::send(const ControlRequest& request) {
+    const bool sendsFile = request.file >= 0;
+    set(CURLOPT_URL, (m_root + request.path).c_str());
+    set(CURLOPT_UPLOAD, sendsFile ? 1L : 0L);
+    set(CURLOPT_CUSTOMREQUEST, request.method);
+    if (sendsFile) {
+        set(CURLOPT_READFUNCTION, &giveFile);
+        set(CURLOPT_READDATA, &request.file);
+        set(CURLOPT_INFILESIZE_LARGE, static_cast<curl_off_t>(request.fileBytes));
+        // It may take its time, but not stand still.
+        constexpr long kStandstill = 60;
+        set(CURLOPT_TIMEOUT, 0L);
+        set(CURLOPT_LOW_SPEED_LIMIT, 1L);
+        set(CURLOPT_LOW_SPEED_TIME, kStandstill);
+    } else if (request.body.empty()) {
+        set(CURLOPT_HTTPGET, 1L);
+    } else {
+        return post(request.headers, request.body, Sending::Once);
+    }
+    return perform(request.headers, Sending::Once);
+}
+
+HttpReply HttpClient::perform(const std::vector<std::string>& headers, Sending sending) {
+    HttpReply reply;
+    m_attempts = sending == Sending::Once ? 1 : std::numeric_limits<int>::max();
+    std::unique_ptr<curl_slist, decltype(CurlLibrary::slistFreeAll)> list(nullptr, curl().slistFreeAll);
+    for (const std::string& header : headers)
+        list.reset(curl().slistAppend(list.release(), header.c_str()));
+    set(CURLOPT_HTTPHEADER, list.get());
     set(CURLOPT_WRITEDATA, &reply);
     set(CURLOPT_HEADERDATA, &reply);
     m_error.front() = '\0';  // the library does not clear what an earlier failure left
-    const CURLcode code = curl_easy_perform(m_curl.get());
+    const CURLcode code = curl().easyPerform(m_curl.get());
     if (code != CURLE_OK) refuse(code, reply.isTooLarge || code == CURLE_FILESIZE_EXCEEDED);
-    curl_easy_getinfo(m_curl.get(), CURLINFO_RESPONSE_CODE, &reply.status);
+    curl().easyGetinfo(m_curl.get(), CURLINFO_RESPONSE_CODE, &reply.status);
     return reply;
 }
 
@@ -235,7 +277,7 @@ void HttpClient::refuse(CURLcode code, bool isTooLarge) const {
     // Without --cacert it is the system that has no certificates, so the user did not name a bad file.
     if (code == CURLE_SSL_CACERT_BADFILE && !m_namesCaFile) code = CURLE_PEER_FAILED_VERIFICATION;
     long sent = 0;
-    curl_easy_getinfo(m_curl.get(), CURLINFO_REQUEST_SIZE, &sent);
+    curl().easyGetinfo(m_curl.get(), CURLINFO_REQUEST_SIZE, &sent);
     if (m_attempts < 0) {
         throw NoAnswer(ExitStatus::Failed, m_url + " closed the connection without an answer.",
                        "Check the server's log, and try again.");
@@ -246,7 +288,7 @@ void HttpClient::refuse(CURLcode code, bool isTooLarge) const {
         throw CommandError(ExitStatus::Interrupted, what, "");
     }
     if (isTooLarge) refuseLargeAnswer(m_url, kLargestAnswer);
-    const std::string reason = m_error.front() == '\0' ? curl_easy_strerror(code) : m_error.data();
+    const std::string reason = m_error.front() == '\0' ? curl().easyStrerror(code) : m_error.data();
     const std::string what = "The request to " + m_url + " failed: " + reason + ".";
     const std::string advice = m_isLocal ? "Check that quenx-cimd runs, and listens there (listen.socket)."
                                          : adviceFor(code, m_url.starts_with("https:"));

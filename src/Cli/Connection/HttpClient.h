@@ -1,8 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
-#include <curl/curl.h>
-
 #include <array>
 #include <functional>
 #include <memory>
@@ -10,6 +8,7 @@
 #include <vector>
 
 #include "Cli/Connection/Connection.h"
+#include "Cli/Connection/CurlLibrary.h"
 
 namespace cli {
 
@@ -22,6 +21,17 @@ struct HttpReply {
     bool isTooLarge = false;  ///< the rest was not read
     std::string cimError;     ///< the header of that name
     std::string retryAfter;   ///< likewise, in seconds
+    bool isControl = false;   ///< has the header of quenx-cimd's own paths
+};
+
+/// A request for one of quenx-cimd's own paths.
+struct ControlRequest {
+    const char* method;
+    std::string path;
+    std::vector<std::string> headers = {};
+    std::string body = {};
+    int file = -1;                ///< what a PUT sends, from where it stands
+    std::uint64_t fileBytes = 0;  ///< how much of it
 };
 
 /// Throws CommandError, for a reply that is no answer to the request itself. NoAnswer where the server may
@@ -46,18 +56,22 @@ class HttpClient {
     /// Sends a body of XML. Throws CommandError when it could not be sent, NoAnswer when only the answer is
     /// missing.
     HttpReply post(const std::vector<std::string>& headers, const std::string& body, Sending sending);
+    /// The same for another path of the server. One client does either this or post().
+    HttpReply send(const ControlRequest& request);
 
   private:
     template <class T>
     void set(CURLoption option, T value) {
-        curl_easy_setopt(m_curl.get(), option, value);
+        curl().easySetopt(m_curl.get(), option, value);
     }
+    HttpReply perform(const std::vector<std::string>& headers, Sending sending);
     [[noreturn]] void refuse(CURLcode code, bool isTooLarge) const;
 
-    std::unique_ptr<CURL, decltype(&curl_easy_cleanup)> m_curl;
+    std::unique_ptr<CURL, decltype(CurlLibrary::easyCleanup)> m_curl;
     std::array<char, CURL_ERROR_SIZE> m_error{};
     std::string m_url;
-    bool m_isLocal;  ///< over a Unix socket
+    std::string m_root;  ///< scheme, host and port
+    bool m_isLocal;      ///< over a Unix socket
     bool m_namesCaFile;
     std::function<bool()> m_isInterrupted;
     int m_attempts = 0;  ///< that the library may still make; negative when it was kept from one

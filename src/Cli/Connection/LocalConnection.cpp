@@ -12,8 +12,9 @@
 #include "Cli/Connection/Connection.h"
 #include "Cli/Display/Messages.h"
 #include "Cli/Display/Terminal.h"
-#include "Framework/Requests/PolicyDecision.h"
+#include "Framework/Requests/Caller.h"
 #include "Framework/Requests/ProviderSession.h"
+#include "History/Log/LogAgent.h"
 #include "MidAPI/ma.h"
 #include "Utils/Os/Linux/linux.h"
 
@@ -72,7 +73,8 @@ struct LocalSession {
     explicit LocalSession(const ProviderSettings& settings)
         : session(settings.configFile, settings.policyFile) {}
 
-    const core::CallerScope caller{{.principal = localUser()}};
+    const core::CallerScope caller{
+        {.principal = localUser(), .address = "local", .front = "quenxctl", .isAdministrator = true}};
     core::ProviderSession session;
 };
 
@@ -125,9 +127,17 @@ Connection openProviders(const ProviderSettings& settings) {
     requirePolicy(*session, settings);
     // The adapters first: providers may ask for them as soon as they are loaded.
     selectAdapters(settings.adapters);
+    const auto history = history::History::wanted();
+    const auto refusals = std::make_shared<RefusalSink>(history);
+    session->keepHistory(refusals);
     loadProviders(session->libraries(), settings.directory);
+    history::serveLog(*session, history);
     // The operations share ownership with the session, so the libraries stay loaded while they can be called.
-    return {.operations = {local, session->operations().get()}, .isInProcess = true, .sharesFiles = true};
+    return {.operations = {local, session->operations().get()},
+            .history = history,
+            .refusals = refusals,
+            .isInProcess = true,
+            .sharesFiles = true};
 }
 
 }  // namespace cli

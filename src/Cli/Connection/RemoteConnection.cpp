@@ -13,7 +13,9 @@
 #include "CimXml/Response.h"
 #include "CimXml/WireError.h"
 #include "Cli/Connection/HttpClient.h"
+#include "Cli/Connection/ServerControl.h"
 #include "Cli/Display/Messages.h"
+#include "Cli/Display/Terminal.h"
 #include "Utils/Os/Linux/EchoOff.h"
 #include "Utils/Utils.h"
 
@@ -304,13 +306,7 @@ std::vector<core::ClassChain> RemoteOperations::enumerateClasses(const std::stri
 
 /// The line that the user answers with. Throws CommandError with these texts where nobody can answer.
 std::string ask(const std::string& prompt, const std::string& missing, const std::string& advice) {
-    std::string line;
-    // In a script or a service nobody would answer, and the program would wait forever.
-    if (isatty(STDIN_FILENO) == 1) {
-        std::cerr << prompt << std::flush;
-        if (std::getline(std::cin, line) && !line.empty()) return line;
-        std::cerr << '\n';
-    }
+    if (const auto line = askOnTerminal(prompt, {}); line && !line->empty()) return *line;
     throw CommandError(ExitStatus::WrongUse, missing, advice);
 }
 
@@ -362,11 +358,12 @@ void requireNoLogin(const ServerSettings& settings) {
 
 }  // namespace
 
-Connection openServer(const ServerSettings& settings, std::function<bool()> isInterrupted) {
+Connection openServer(const ServerSettings& settings, const std::function<bool()>& isInterrupted) {
     if (!settings.url->socket().empty()) {
         requireNoLogin(settings);
         requireOwnSocket(settings.url->socket());
-        return {.operations = std::make_shared<RemoteOperations>(settings, "", "", std::move(isInterrupted)),
+        return {.operations = std::make_shared<RemoteOperations>(settings, "", "", isInterrupted),
+                .control = std::make_shared<ServerControl>(settings, "", "", isInterrupted),
                 .isInProcess = false,
                 .sharesFiles = true};
     }
@@ -380,10 +377,10 @@ Connection openServer(const ServerSettings& settings, std::function<bool()> isIn
     }
     const std::string user = settings.user.empty() ? userName() : settings.user;
     const std::string password = passwordOf(user);
-    return {
-        .operations = std::make_shared<RemoteOperations>(settings, user, password, std::move(isInterrupted)),
-        .isInProcess = false,
-        .sharesFiles = settings.url->isLoopback()};
+    return {.operations = std::make_shared<RemoteOperations>(settings, user, password, isInterrupted),
+            .control = std::make_shared<ServerControl>(settings, user, password, isInterrupted),
+            .isInProcess = false,
+            .sharesFiles = settings.url->isLoopback()};
 }
 
 }  // namespace cli

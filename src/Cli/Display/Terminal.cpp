@@ -7,6 +7,7 @@
 
 #include <algorithm>
 #include <cstdlib>
+#include <iostream>
 
 #include "CimXml/Xml.h"
 #include "Utils/Utils.h"
@@ -97,6 +98,23 @@ std::size_t Terminal::width() const {
     winsize size{};
     if (descriptor < 0 || ioctl(descriptor, TIOCGWINSZ, &size) != 0 || size.ws_col == 0) return kUsual;
     return size.ws_col;
+}
+
+std::optional<std::string> askOnTerminal(const std::string& prompt,
+                                         const std::function<bool()>& isInterrupted) {
+    // In a script or a service nobody would answer, and the program would wait forever.
+    if (isatty(STDIN_FILENO) != 1) return std::nullopt;
+    std::cerr << prompt << std::flush;
+    constexpr int kMilliseconds = 200;
+    pollfd keyboard{STDIN_FILENO, POLLIN, 0};
+    std::string line;
+    while (isInterrupted && ::poll(&keyboard, 1, kMilliseconds) <= 0)
+        if (isInterrupted()) {
+            std::cerr << '\n';
+            return std::nullopt;
+        }
+    if (!std::getline(std::cin, line) || line.empty()) std::cerr << '\n';
+    return line;
 }
 
 std::size_t LinePrinter::width() const {

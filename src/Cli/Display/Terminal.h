@@ -2,6 +2,8 @@
 #pragma once
 
 #include <cstddef>
+#include <functional>
+#include <optional>
 #include <ostream>
 #include <string>
 #include <string_view>
@@ -30,6 +32,12 @@ struct Terminal {
     /// In columns; 80 when the terminal does not say.
     std::size_t width() const;
 };
+
+/// The line that the user answers with. Nothing where standard input is no terminal, or when an interruption
+/// is asked for; empty when nothing was typed.
+/// @param isInterrupted  asked now and then while nothing is typed; empty where a signal ends the program
+std::optional<std::string> askOnTerminal(const std::string& prompt,
+                                         const std::function<bool()>& isInterrupted);
 
 /// Puts lines on one terminal or into one file: lines that stay, and on a terminal one line at the bottom
 /// that is written over.

@@ -122,7 +122,8 @@ Comparison compare(const ma::RomFile& rom, const Adapter& adapter, const std::ve
     if (!adapter.ids.empty()) result.foreignIds = firstForeignIds(rom, adapter.ids);
     result.current = !result.chosen.empty() && !losesClp(adapter, result.chosen) &&
                      std::ranges::all_of(result.chosen, [&](const Component& component) {
-                         return versionOf(adapter.components, component.type) == component.version;
+                         const Component* installed = findComponent(adapter.components, component.type);
+                         return installed != nullptr && installed->flashText() == component.versionText();
                      });
     return result;
 }
@@ -144,8 +145,12 @@ void requireKnownTypes(core::CimOperations& operations, const std::vector<std::s
 
 Candidate compared(const Connection& connection, Candidate candidate) {
     // If the service runs on another machine, the same path may name another file.
-    const std::optional<std::string> path = localPath(candidate.uri);
-    if (!path || !connection.sharesFiles) return candidate;
+    std::optional<std::string> path;
+    if (!candidate.localFile.empty())
+        path = candidate.localFile;
+    else if (connection.sharesFiles)
+        path = localPath(candidate.uri);
+    if (!path) return candidate;
     candidate.image = readImage(*path, [&](std::span<const std::uint8_t> content) {
         if (connection.isInProcess)
             candidate.verdict = ma::judgeImage(candidate.adapter.name, content, typesOf(candidate.types));
@@ -183,14 +188,58 @@ std::optional<std::string> localPath(std::string_view uri) {
     return std::string(rest.substr(kAuthority.size()));
 }
 
-bool Candidate::isAlreadyCurrent() const {
-    // An image for another card can have the same versions: the service is to refuse that one.
-    return comparison && comparison->current && comparison->foreignIds.empty() && comparison->isNetwork &&
-           comparison->missing.empty() && adapter.updatable;
+Candidate::Answer Candidate::fits() const {
+    if (!adapter.updatable || (verdict && verdict->status == ma::PrepareStatus::ImageNotSupported))
+        return Answer::No;
+    if (verdict) return verdict->isForCard ? Answer::Yes : Answer::Unknown;
+    if (!comparison) return Answer::Unknown;
+    if (!comparison->isNetwork || !comparison->foreignIds.empty()) return Answer::No;
+    return adapter.ids.empty() ? Answer::Unknown : Answer::Yes;
 }
 
+Candidate::Answer Candidate::isInFlash() const {
+    const auto answer = [](bool isSo) { return isSo ? Answer::Yes : Answer::No; };
+    // An image for another card can have the same versions: the service is to refuse that one.
+    if (fits() == Answer::No || (image && image->problem)) return Answer::No;
+    if (verdict) {
+        // What is older than what runs may be what waits for a reset.
+        const bool isTaken = verdict->status == ma::PrepareStatus::Prepared ||
+                             verdict->status == ma::PrepareStatus::ImageIsOlder;
+        if (!isTaken) return Answer::No;
+        if (verdict->versions.empty()) return Answer::Unknown;
+        return answer(std::ranges::all_of(
+            verdict->versions, [](const auto& version) { return version.inFlash == version.inFile; }));
+    }
+    if (!comparison || (adapter.components.empty() && !adapter.answers)) return Answer::Unknown;
+    return answer(comparison->current && comparison->missing.empty());
+}
+
+std::vector<Component> Candidate::brought() const {
+    if (comparison) return comparison->chosen;
+    std::vector<Component> components;
+    if (verdict)
+        for (const ma::ImageVerdict::Version& version : verdict->versions)
+            components.push_back({.type = version.name, .text = version.inFile});
+    return components;
+}
+
+namespace {
+
+/// The file to send; empty where the server has the image.
+std::string fileToSend(const UpdateOptions& options) {
+    if (!options.upload) return {};
+    if (std::optional<std::string> path = localPath(imageUri(options.image))) return std::move(*path);
+    throw CommandError(ExitStatus::WrongUse, options.image + " is no file that can be sent.",
+                       "Name a file of this machine, or leave out --upload.");
+}
+
+}  // namespace
+
 Candidate makeCandidate(const Connection& connection, const UpdateOptions& options) {
-    Adapter adapter = findAdapter(connection, options.target);
+    return makeCandidate(connection, findAdapter(connection, options.target), options);
+}
+
+Candidate makeCandidate(const Connection& connection, Adapter adapter, const UpdateOptions& options) {
     if (!options.identity.empty()) {
         return makeCandidate(connection, std::move(adapter),
                              findById(*connection.operations, options.identity), options.force);
@@ -199,7 +248,8 @@ Candidate makeCandidate(const Connection& connection, const UpdateOptions& optio
     return compared(connection, {.adapter = std::move(adapter),
                                  .uri = imageUri(options.image),
                                  .types = options.types,
-                                 .force = options.force});
+                                 .force = options.force,
+                                 .localFile = fileToSend(options)});
 }
 
 Candidate makeCandidate(const Connection& connection, Adapter adapter, const InventoryItem& image,

@@ -211,9 +211,13 @@ std::string backendOf(const core::InstanceValue& port) {
     return identifyingText(port, "Adapter Backend");
 }
 
-bool Adapter::waitsForReset() const {
+bool waitsForReset(const std::vector<Component>& components, const std::string& resetNeeded) {
     return std::ranges::any_of(components, [](const Component& each) { return !each.stored.empty(); }) ||
            (resetNeeded != "none" && resetNeeded != "unknown");
+}
+
+bool Adapter::waitsForReset() const {
+    return cli::waitsForReset(components, resetNeeded);
 }
 
 std::string adviceForSilence(const Connection& connection) {

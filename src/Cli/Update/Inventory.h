@@ -21,6 +21,8 @@ struct Component {
     std::string stored = {};  ///< what takes effect after a reset; empty when nothing waits for one
 
     std::string versionText() const { return text.empty() ? std::to_string(version) : text; }
+    /// The version in the flash: the one that runs, unless another waits for a reset.
+    std::string flashText() const { return stored.empty() ? versionText() : stored; }
     /// Whether what runs is the same.
     bool operator==(const Component& other) const {
         return type == other.type && versionText() == other.versionText();
@@ -35,6 +37,10 @@ std::optional<std::uint32_t> versionOf(const std::vector<Component>& components,
 
 /// "IMG_PXE 1, IMG_UEFI 0", "fw.mgmt 1.2 (1.3 after a reset)"; "nothing" for none.
 std::string componentsText(const std::vector<Component>& components);
+
+/// New firmware that does not run yet; false where the adapter does not tell.
+/// @param resetNeeded  as Adapter has it
+bool waitsForReset(const std::vector<Component>& components, const std::string& resetNeeded);
 
 /// An adapter port as the model shows it.
 struct Adapter {

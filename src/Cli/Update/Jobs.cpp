@@ -3,6 +3,7 @@
 
 #include <algorithm>
 #include <array>
+#include <ctime>
 #include <limits>
 #include <unordered_map>
 
@@ -144,6 +145,15 @@ void to_json(Json& json, const JobView& job) {
             {"percentComplete", job.percent},
             {"errorCode", job.errorCode},
             {"errorDescription", job.errorDescription}};
+}
+
+std::string momentText(const std::optional<utils::Time>& moment) {
+    if (!moment || moment->isPeriod()) return "-";  // an interval, not a moment
+    const auto seconds = static_cast<std::time_t>(moment->getSeconds());
+    std::tm local{};
+    std::array<char, sizeof "9999-12-31 23:59:59"> text{};
+    if (localtime_r(&seconds, &local) == nullptr) return "-";
+    return {text.data(), std::strftime(text.data(), text.size(), "%Y-%m-%d %H:%M:%S", &local)};
 }
 
 std::vector<JobView> listJobs(core::CimOperations& operations) {

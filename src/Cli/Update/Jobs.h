@@ -39,6 +39,9 @@ struct JobView {
 };
 void to_json(nlohmann::ordered_json& json, const JobView& job);
 
+/// "2026-11-21 20:10:33" in the local time zone; "-" for none.
+std::string momentText(const std::optional<utils::Time>& moment);
+
 /// All jobs that the service knows, without their adapters.
 std::vector<JobView> listJobs(core::CimOperations& operations);
 /// The same with their adapters.

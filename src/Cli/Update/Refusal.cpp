@@ -6,6 +6,9 @@
 #include <cerrno>
 #include <system_error>
 
+#include "Cli/Connection/ServerControl.h"
+#include "Cli/Update/ServedLog.h"
+
 namespace cli {
 
 namespace {
@@ -78,6 +81,27 @@ Reason explainHiddenHolder(std::uint32_t returnValue, const Candidate& candidate
                        kWaitOrRestart};
 }
 
+/// In the words of the service, where it is known what they were.
+Reason explainTold(const Connection& connection, std::uint32_t returnValue, const Candidate& candidate) {
+    const std::string reason = toldReason(connection, candidate.adapter.name, returnValue);
+    if (reason.empty()) return std::nullopt;
+    // It may have met anything.
+    const bool isVague = returnValue == MethodReturn::UnspecifiedError;
+    return Explanation{sentence(reason), isVague ? kAskLogAgain : explainReturnValue(returnValue).advice};
+}
+
+/// What the server itself tells of its hold. Nothing where it tells none.
+Reason explainClaim(const Connection& connection) {
+    const auto held = connection.control == nullptr ? std::nullopt : connection.control->held();
+    if (!held || held->adapter.empty()) return std::nullopt;
+    const std::string text = held->adapter + " is held by " + held->text();
+    if (held->isNeeded)
+        return Explanation{text + ". The server works on one adapter at a time.",
+                           "Try again when that has ended; \"quenxctl status\" shows it."};
+    return Explanation{text + ", which has ended.",
+                       "Free it with \"quenxctl release " + held->adapter + "\" and the same --server."};
+}
+
 /// Who holds the adapter. If the service is busy with another adapter, it answers as it does for an image
 /// that it cannot read. In process, no other client can.
 Reason explainHolder(const Connection& connection, std::uint32_t returnValue, const Candidate& candidate) {
@@ -100,6 +124,8 @@ Reason explainHolder(const Connection& connection, std::uint32_t returnValue, co
                                ", on the server's machine.",
                            "Try again when that process is done."};
     }
+    if (const Reason claim = explainClaim(connection)) return claim;
+    if (const Reason told = explainTold(connection, returnValue, candidate)) return told;
     return explainHiddenHolder(returnValue, candidate);
 }
 
@@ -288,7 +314,14 @@ Explanation explainRefusal(const Connection& connection, std::uint32_t returnVal
                            const Candidate& candidate) {
     // Who holds the adapter goes first: the image may be all right.
     Reason reason = explainHolder(connection, returnValue, candidate);
+    // These two mean anything, of which nothing can be seen from afar.
+    const bool isGuessed =
+        returnValue == MethodReturn::UnspecifiedError || returnValue == MethodReturn::InvalidParameter;
+    if (!reason && isGuessed && !connection.isInProcess)
+        reason = explainTold(connection, returnValue, candidate);
     if (!reason) reason = explainImage(connection, returnValue, candidate);
+    if (!reason && (!isGuessed || connection.isInProcess))
+        reason = explainTold(connection, returnValue, candidate);
     return reason ? *reason : explainReturnValue(returnValue);
 }
 
@@ -305,11 +338,11 @@ Explanation explainFailedJob(const Connection& connection, const JobView& job, c
             next + advice};
 }
 
-std::string adviceAfterCheck(const Connection& connection, const std::string& adapter) {
-    if (connection.isInProcess) return {};
-    return "Unless the configuration of its providers has \"ReleaseClaimAfterCheck=1\", the server now "
-           "holds " +
-           adapter + " and refuses further checks and installs until it is restarted.";
+std::string warningOfHold(const std::string& adapter) {
+    return "This server can check an image only by holding " + adapter +
+           ": unless its configuration has \"ReleaseClaimAfterCheck=1\", it refuses further checks and "
+           "installs "
+           "after that until it is restarted.";
 }
 
 }  // namespace cli

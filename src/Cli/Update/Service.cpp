@@ -1,8 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Cli/Update/Service.h"
 
+#include "Cli/Connection/ServerControl.h"
 #include "Framework/Classes/RequestScope.h"
 #include "Framework/Requests/Audit.h"
+#include "Framework/Requests/UpdateSink.h"
 #include "Providers/Schema/ProviderInterfaces.h"
 #include "Providers/Schema/ValueMaps.h"
 #include "Utils/Utils.h"
@@ -29,10 +31,10 @@ struct InstallCodes {
     std::vector<std::uint16_t> codes;
     std::vector<std::string> values;
 
-    explicit InstallCodes(const Candidate& candidate) {
-        if (!candidate.identity.isValid() && !candidate.types.empty()) {
+    InstallCodes(const Candidate& candidate, const std::vector<std::string>& types) {
+        if (!types.empty()) {
             codes.push_back(InstallOption::TargetTypes);
-            values.push_back(joined(candidate.types, {&InstallOption::kTargetTypeSeparator, 1}));
+            values.push_back(joined(types, {&InstallOption::kTargetTypeSeparator, 1}));
         }
         codes.push_back(InstallOption::Update);  // the service requires it
         if (candidate.force) codes.push_back(InstallOption::ForceInstallation);
@@ -58,7 +60,7 @@ struct ServiceCall {
     /// own.
     void audit(const Connection& connection, const std::string& outcome) const {
         if (connection.isInProcess)
-            core::audit({localUser(), "local", method, service.toString(), outcome}, arguments);
+            core::audit({core::CallerScope::current(), method, service.toString(), outcome}, arguments);
     }
 
     core::MethodResult run(const Connection& connection) const try {
@@ -80,13 +82,15 @@ struct ServiceCall {
 }  // namespace
 
 void auditOwn(const std::string& operation, const std::string& target, const std::string& outcome) {
-    core::audit({localUser(), "local", operation, target, outcome});
+    core::audit({core::CallerScope::current(), operation, target, outcome});
 }
 
 core::MethodResult startUpdate(const Connection& connection, const Candidate& candidate) {
     using core::CimType;
     using core::CimValue;
-    const InstallCodes options(candidate);
+    // The method for an identity asks the inventory for its types.
+    const bool isNamedById = candidate.identity.isValid();
+    const InstallCodes options(candidate, isNamedById ? std::vector<std::string>() : candidate.types);
     std::vector<core::CimScalar> codes;
     for (const std::uint64_t code : options.codes)
         codes.emplace_back(code);
@@ -95,7 +99,7 @@ core::MethodResult startUpdate(const Connection& connection, const Candidate& ca
             ? CimValue::null(CimType::String, true)
             : CimValue::arrayOf(CimType::String, {options.values.begin(), options.values.end()});
     const ServiceCall call{findService(*connection.operations),
-                           candidate.identity.isValid() ? "InstallFromSoftwareIdentity" : "InstallFromURI",
+                           isNamedById ? "InstallFromSoftwareIdentity" : "InstallFromURI",
                            {imageOf(candidate),
                             reference("Target", candidate.adapter.path),
                             {"InstallOptions", CimValue::arrayOf(CimType::Uint16, codes)},
@@ -122,21 +126,30 @@ core::CimPath jobOf(const core::CimOperations& operations, const core::MethodRes
 }
 
 std::optional<std::uint32_t> verifyOnly(const Connection& connection, const Candidate& candidate) {
-    ServiceCall call{findService(*connection.operations),
-                     "CheckSoftwareIdentity",
-                     {imageOf(candidate), reference("Target", candidate.adapter.path)}};
-    if (candidate.identity.isValid()) return call.run(connection).returnValue;
+    // No method of the model does this. The service's own interface does, here or behind quenx-cimd's paths.
+    const InstallCodes options(candidate, candidate.types);
+    if (connection.control != nullptr)
+        return connection.control->checkImage(candidate.uri, candidate.adapter.path.toString(), options.codes,
+                                              options.values);
     if (!connection.isInProcess) return std::nullopt;
-    // No method of the model does this; the service's own interface in this process does.
     const core::RequestScope scope;
-    update::ImageCheck* check = update::findImageCheck(call.service);
+    const ServiceCall call{findService(*connection.operations),
+                           "CheckImage",
+                           {imageOf(candidate), reference("Target", candidate.adapter.path)}};
+    core::CimPath service = call.service;
+    update::ImageCheck* check = update::findImageCheck(service);
     if (check == nullptr) return std::nullopt;
-    const InstallCodes options(candidate);
     const unsigned int returned =
         check->checkImage(candidate.uri, candidate.adapter.path, options.codes, options.values);
-    call.method = "CheckImage";
     call.audit(connection, core::outcomeOf(core::MethodResult{returned, {}}));
     return returned;
+}
+
+std::uint32_t checkIdentity(const Connection& connection, const Candidate& candidate) {
+    const ServiceCall call{findService(*connection.operations),
+                           "CheckSoftwareIdentity",
+                           {imageOf(candidate), reference("Target", candidate.adapter.path)}};
+    return call.run(connection).returnValue;
 }
 
 }  // namespace cli

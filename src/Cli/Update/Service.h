@@ -22,10 +22,17 @@ core::MethodResult startUpdate(const Connection& connection, const Candidate& ca
 /// none, or one that these operations cannot look at.
 core::CimPath jobOf(const core::CimOperations& operations, const core::MethodResult& result);
 
-/// Has the service verify the image as startUpdate() does, without installing it. Returns what the method
-/// would, 0 for an image that could be installed. Nothing for a file on a server, whose service has no method
-/// for that.
+/// Has the service verify the image as startUpdate() does, without installing it or claiming the adapter.
+/// Returns what the method would, 0 for an image that could be installed. Nothing where the server has only
+/// the model's method for that, CheckSoftwareIdentity.
 std::optional<std::uint32_t> verifyOnly(const Connection& connection, const Candidate& candidate);
+
+/// Calls CheckSoftwareIdentity for an image of the inventory, which may leave the adapter claimed. Returns
+/// what it does.
+std::uint32_t checkIdentity(const Connection& connection, const Candidate& candidate);
+
+/// What to tell before checkIdentity(): that the server may hold the adapter afterwards.
+std::string warningOfHold(const std::string& adapter);
 
 /// Leaves the audit line of a change that this process makes by itself, without the service.
 void auditOwn(const std::string& operation, const std::string& target, const std::string& outcome);
@@ -39,8 +46,5 @@ Explanation explainRefusal(const Connection& connection, std::uint32_t returnVal
 /// @param after  what the adapter carries now; empty when that could not be read
 Explanation explainFailedJob(const Connection& connection, const JobView& job, const Candidate& candidate,
                              const std::vector<Component>& after);
-
-/// That a check on a server may keep the adapter from everybody else; empty in process.
-std::string adviceAfterCheck(const Connection& connection, const std::string& adapter);
 
 }  // namespace cli

@@ -2,142 +2,48 @@
 // Installing an image, and checking whether it could be installed.
 #include <algorithm>
 
+#include "Cli/Connection/ServerControl.h"
 #include "Cli/Display/Output.h"
 #include "Cli/Update/Card.h"
+#include "Cli/Update/PastImages.h"
 #include "Cli/Update/Service.h"
-#include "Cli/Verbs/Verbs.h"
+#include "Cli/Verbs/ManyResults.h"
+#include "Cli/Verbs/Outcome.h"
 
 namespace cli {
 
 namespace {
 
-/// How an install, or a check of one, ended: the same facts for a person and for a script.
-struct Outcome {
-    explicit Outcome(const Candidate& candidate)
-        : adapter(candidate.adapter.name),
-          label(labelOf(candidate.adapter.name, candidate.adapter.backend)),
-          backend(candidate.adapter.backend),
-          uri(candidate.uri),
-          unchecked(candidate.verdict ? candidate.verdict->unchecked : std::vector<std::string>()),
-          resetNeeded(candidate.adapter.resetNeeded),
-          before(candidate.adapter.components),
-          after(before) {}
-
-    void end(ExitStatus with, const std::string& how, const std::string& what) {
-        status = with;
-        result = how;
-        message = what;
-    }
-    void end(const std::string& how, const Explanation& why) {
-        end(why.status, how, why.message);
-        advice = why.advice;
-    }
-    /// For a person: if the adapter is already current, nothing has failed.
-    bool isFailure() const { return status != ExitStatus::Done && status != ExitStatus::AlreadyCurrent; }
-
-    ExitStatus status = ExitStatus::Failed;
-    std::string result;   ///< "updated", "installable", "already current", "refused", "failed", "unknown"
-    std::string message;  ///< what happened
-    std::string advice;   ///< what to do next; may be empty
-    std::string adapter;
-    std::string label;  ///< the adapter's, for results
-    std::string backend;
-    std::string uri;
-    std::optional<std::uint32_t> returnValue;  ///< of the method, when it was called
-    std::optional<JobView> job;                ///< when one was started
-    std::vector<std::string> unchecked;        ///< what only the write can show
-    std::string resetNeeded;                   ///< by what was written, as the model tells it
-    std::optional<ma::CardUse> card;           ///< looked at before an install in process
-    std::vector<Component> before;
-    std::vector<Component> after;  ///< as before until something is written; empty if it cannot be read
-};
-
-void to_json(Json& json, const Outcome& outcome) {
-    json = {{"result", outcome.result},
-            {"exitStatus", static_cast<int>(outcome.status)},
-            {"message", outcome.message},
-            {"advice", outcome.advice},
-            {"adapter", outcome.adapter},
-            {"backend", outcome.backend},
-            {"uri", outcome.uri},
-            {"returnValue", nullptr},
-            {"job", nullptr},
-            {"unchecked", outcome.unchecked},
-            {"resetNeeded", outcome.resetNeeded},
-            {"before", outcome.before},
-            {"after", outcome.after}};
-    if (outcome.returnValue) json["returnValue"] = *outcome.returnValue;
-    if (outcome.job) json["job"] = *outcome.job;
-    if (outcome.card) json["card"] = cardJson(*outcome.card);
-}
-
-/// "1 -> 2", "1 (unchanged)", "1.2 -> 1.3 after a reset"
-std::string changeText(const Component* before, const Component* after) {
-    const auto text = [](const Component* component) {
-        return component == nullptr ? std::string("none") : component->versionText();
-    };
-    if (after != nullptr && !after->stored.empty())
-        return text(after) + " -> " + after->stored + " after a reset";
-    return text(before) == text(after) ? text(after) + " (unchanged)" : text(before) + " -> " + text(after);
-}
-
-void printChange(std::ostream& out, const Outcome& outcome) {
-    std::vector<std::vector<std::string>> rows;
-    for (const Component& component : outcome.after) {
-        rows.push_back(
-            {"  " + component.type, changeText(findComponent(outcome.before, component.type), &component)});
-    }
-    for (const Component& component : outcome.before) {
-        if (outcome.after.empty() || findComponent(outcome.after, component.type) != nullptr) continue;
-        rows.push_back({"  " + component.type, changeText(&component, nullptr)});
-    }
-    printTable(out, rows);
-}
-
-void printUnchecked(std::ostream& out, const Outcome& outcome) {
-    if (outcome.unchecked.empty()) return;
-    out << "It could not be checked " << printable(joined(outcome.unchecked, "; "))
-        << ". The adapter judges that when the image is written.\n";
-}
-
 ExitStatus print(Context& context, const Outcome& outcome) {
-    if (context.json) {
+    if (context.json)
         printJson(context.out, outcome);
-        return outcome.status;
-    }
-    std::ostream& stream = outcome.isFailure() ? context.error : context.out;
-    stream << (outcome.isFailure() ? "quenxctl: " : "") << printable(outcome.message) << '\n';
-    // After a failure the explanation says what the adapter has now.
-    if (outcome.result == "updated") printChange(stream, outcome);
-    if (outcome.result == "installable") printUnchecked(stream, outcome);
-    if (!outcome.advice.empty()) stream << printable(outcome.advice) << '\n';
+    else
+        printText(context, outcome);
     return outcome.status;
-}
-
-void endAsCurrent(Outcome& outcome, const Candidate& candidate) {
-    outcome.end(
-        ExitStatus::AlreadyCurrent, "already current",
-        outcome.label + " is already current: it has " + componentsText(candidate.comparison->chosen) + ".");
 }
 
 /// If the adapter still has the old versions, the update did not complete, although the service says so.
 bool isInPlace(const Candidate& candidate, const std::vector<Component>& after) {
     if (!candidate.comparison || after.empty()) return true;
     const std::vector<Component>& chosen = candidate.comparison->chosen;
-    return std::ranges::all_of(
-        chosen, [&](const Component& each) { return std::ranges::find(after, each) != after.end(); });
+    return std::ranges::all_of(chosen, [&](const Component& each) {
+        const Component* found = findComponent(after, each.type);
+        return found != nullptr && found->flashText() == each.versionText();
+    });
 }
 
 /// For an update that completed, as the service says.
 void judgeCompleted(Outcome& outcome, const Candidate& candidate) {
     const std::string& name = outcome.adapter;
     if (!isInPlace(candidate, outcome.after)) {
-        outcome.end("failed", {"The update of " + name + " ended without an error, but " + name + " has " +
-                                   componentsText(outcome.after) + ", not what the image has.",
-                               "Check the system log, then install again with --force."});
+        outcome.end(Ending::Failed,
+                    {"The update of " + name + " ended without an error, but " + name + " has " +
+                         componentsText(outcome.after) + ", not what the image has.",
+                     "Check the system log, then install again with --force."});
     } else {
-        const bool wasCurrent = candidate.comparison && candidate.comparison->current;
-        outcome.end(ExitStatus::Done, "updated",
+        const bool wasCurrent = candidate.isAlreadyCurrent();
+        outcome.end(ExitStatus::Done,
+                    outcome.isResetPending() ? Ending::UpdatedResetPending : Ending::Updated,
                     outcome.label + (wasCurrent ? " was rewritten with the same version." : " was updated."));
         if (outcome.after.empty() && !outcome.before.empty())
             outcome.advice = "Its versions cannot be read now; \"quenxctl adapters\" shows them later.";
@@ -159,7 +65,7 @@ void readBack(core::CimOperations& operations, const Candidate& candidate, Outco
 /// The update is under way, or may be, and this program no longer sees it: nor what the adapter has now.
 void endAsUnknown(Outcome& outcome, const Explanation& why) {
     outcome.after.clear();
-    outcome.end("unknown", why);
+    outcome.end(Ending::Unknown, why);
 }
 
 void followUpdate(Context& context, const core::CimPath& job, const Candidate& candidate, Outcome& outcome) {
@@ -184,13 +90,14 @@ void followUpdate(Context& context, const core::CimPath& job, const Candidate& c
     if (outcome.job->hasSucceeded()) {
         judgeCompleted(outcome, candidate);
     } else {
-        outcome.end("failed", explainFailedJob(context.connection, *outcome.job, candidate, outcome.after));
+        outcome.end(Ending::Failed,
+                    explainFailedJob(context.connection, *outcome.job, candidate, outcome.after));
     }
 }
 
 /// Once the service was called and has returned this.
-ExitStatus conclude(Context& context, const core::MethodResult& result, const Candidate& candidate,
-                    Outcome& outcome) try {
+void conclude(Context& context, const core::MethodResult& result, const Candidate& candidate,
+              Outcome& outcome) try {
     outcome.returnValue = result.returnValue;
     if (result.returnValue == MethodReturn::JobStarted) {
         followUpdate(context, jobOf(*context.connection.operations, result), candidate, outcome);
@@ -199,11 +106,10 @@ ExitStatus conclude(Context& context, const core::MethodResult& result, const Ca
         readBack(*context.connection.operations, candidate, outcome);
         judgeCompleted(outcome, candidate);
     } else {
-        outcome.end("refused", explainRefusal(context.connection, result.returnValue, candidate));
+        outcome.end(Ending::Refused, explainRefusal(context.connection, result.returnValue, candidate));
     }
     // An update in this program may still run when nobody knows how it ends.
-    if (outcome.result != "unknown") context.following.over();
-    return print(context, outcome);
+    if (outcome.ending != Ending::Unknown) context.following.over();
 } catch (const CommandError&) {
     throw;
 } catch (const core::CimError&) {
@@ -230,18 +136,20 @@ std::optional<core::MethodResult> start(Context& context, const Candidate& candi
     }
 }
 
-/// Throws CommandError with ExitStatus::Interrupted only while nothing has been started.
-ExitStatus installUnlessInterrupted(Context& context, const UpdateOptions& options) {
-    const Candidate candidate = makeCandidate(context.connection, options);
+/// Has the server have the image, which is a file here.
+std::string uploaded(const Connection& connection, const std::string& file) {
+    if (const auto uri = connection.control->upload(file)) return *uri;
+    throw CommandError(ExitStatus::Failed, "This server takes no images over the network.",
+                       "Copy " + file + " to its machine, and name it there without --upload.");
+}
+
+}  // namespace
+
+Outcome installCandidate(Context& context, const Candidate& named) {
+    Candidate candidate = named;
+    if (!candidate.localFile.empty()) candidate.uri = uploaded(context.connection, candidate.localFile);
     Outcome outcome(candidate);
     if (context.connection.isInProcess) outcome.card = readCard(context.connection, outcome.adapter);
-    // Checked here: the service would write the same image again.
-    if (!candidate.force && candidate.isAlreadyCurrent()) {
-        endAsCurrent(outcome, candidate);
-        outcome.advice = "Use --force to write it again.";
-        context.following.over();
-        return print(context, outcome);
-    }
     if (!context.json) {
         printUnchecked(context.out, outcome);
         if (outcome.card) printCard(context.out, *outcome.card);
@@ -249,44 +157,67 @@ ExitStatus installUnlessInterrupted(Context& context, const UpdateOptions& optio
     // The last moment to stop: once the service is called, nobody can.
     if (context.following.interrupted()) throw CommandError(ExitStatus::Interrupted, "Interrupted.", "");
     const std::optional<core::MethodResult> result = start(context, candidate, outcome);
-    return result ? conclude(context, *result, candidate, outcome) : print(context, outcome);
+    if (result) conclude(context, *result, candidate, outcome);
+    outcome.historyId = ownRecordOf(context.connection, candidate.adapter);
+    return outcome;
+}
+
+ExitStatus install(Context& context, const VerbOptions& options) try {
+    if (options.many.isAsked()) return installMany(context, options);
+    const Candidate candidate = makeCandidate(context.connection, options.update);
+    // Checked here: the service would write the same image again.
+    if (candidate.force || !candidate.isAlreadyCurrent())
+        return print(context, installCandidate(context, candidate));
+    Outcome outcome(candidate);
+    if (context.connection.isInProcess) outcome.card = readCard(context.connection, outcome.adapter);
+    outcome.endAsCurrent(candidate);
+    outcome.advice = "Use --force to write it again.";
+    context.following.over();
+    return print(context, outcome);
+} catch (const CommandError& error) {
+    if (error.status() != ExitStatus::Interrupted) throw;
+    throw CommandError(ExitStatus::Interrupted, "Interrupted before the update began: nothing was changed.",
+                       "");
+}
+
+namespace {
+
+/// On a server that has no more than the model: it can check the identity that a file belongs to.
+std::uint32_t checkByModel(Context& context, const UpdateOptions& options, Candidate& candidate,
+                           std::string& advice) {
+    const Connection& connection = context.connection;
+    if (options.force || !options.types.empty())
+        throw CommandError(ExitStatus::WrongUse, "This server's checks take neither --types nor --force.",
+                           "Leave them out, or check without --server.");
+    if (!candidate.identity.isValid())
+        candidate = makeCandidate(connection, std::move(candidate.adapter),
+                                  findByFile(*connection.operations, options.image), false);
+    const std::string warning = warningOfHold(candidate.adapter.name);
+    if (context.json)
+        advice = warning;
+    else
+        context.error << "quenxctl: Warning: " << printable(warning) << std::endl;
+    return checkIdentity(connection, candidate);
 }
 
 }  // namespace
 
-ExitStatus install(Context& context, const VerbOptions& options) {
-    try {
-        return installUnlessInterrupted(context, options.update);
-    } catch (const CommandError& error) {
-        if (error.status() != ExitStatus::Interrupted) throw;
-        throw CommandError(ExitStatus::Interrupted,
-                           "Interrupted before the update began: nothing was changed.", "");
-    }
-}
-
 ExitStatus check(Context& context, const VerbOptions& options) {
     const Connection& connection = context.connection;
     Candidate candidate = makeCandidate(connection, options.update);
+    std::string advice;
     std::optional<std::uint32_t> returnValue = verifyOnly(connection, candidate);
-    // If a server cannot check a file, it can check the identity that the file belongs to.
-    if (!returnValue) {
-        if (options.update.force || !options.update.types.empty()) {
-            throw CommandError(ExitStatus::WrongUse, "A check on a server takes neither --types nor --force.",
-                               "Leave them out, or check without --server.");
-        }
-        candidate = makeCandidate(connection, std::move(candidate.adapter),
-                                  findByFile(*connection.operations, options.update.image), false);
-        returnValue = verifyOnly(connection, candidate);
-    }
+    if (!returnValue) returnValue = checkByModel(context, options.update, candidate, advice);
     Outcome outcome(candidate);
     outcome.returnValue = returnValue;
-    outcome.advice = adviceAfterCheck(connection, outcome.adapter);
+    outcome.advice = advice;
     if (returnValue != MethodReturn::Completed) {
-        outcome.end("refused", explainRefusal(connection, *returnValue, candidate));
+        outcome.end(Ending::Refused, explainRefusal(connection, *returnValue, candidate));
     } else if (!candidate.force && candidate.isAlreadyCurrent()) {
-        endAsCurrent(outcome, candidate);
+        outcome.endAsCurrent(candidate);
     } else {
-        outcome.end(ExitStatus::Done, "installable", "The image can be installed on " + outcome.label + ".");
+        outcome.end(ExitStatus::Done, Ending::Installable,
+                    "The image can be installed on " + outcome.label + ".");
     }
     return print(context, outcome);
 }

@@ -1,8 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 // The jobs of a server.
 #include <algorithm>
-#include <array>
-#include <ctime>
 
 #include "Cli/Display/Output.h"
 #include "Cli/Verbs/Verbs.h"
@@ -24,16 +22,6 @@ std::string orDash(const std::string& text) {
     return text.empty() ? "-" : text;
 }
 
-/// "2026-11-21 20:10:33" in the local time zone; "-" for none.
-std::string startText(const JobView& job) {
-    if (!job.start || job.start->isPeriod()) return "-";  // an interval, not a moment
-    const auto seconds = static_cast<std::time_t>(job.start->getSeconds());
-    std::tm local{};
-    std::array<char, sizeof "9999-12-31 23:59:59"> text{};
-    if (localtime_r(&seconds, &local) == nullptr) return "-";
-    return {text.data(), std::strftime(text.data(), text.size(), "%Y-%m-%d %H:%M:%S", &local)};
-}
-
 /// There is a column for the users if the service names at least one.
 void printJobs(std::ostream& out, const std::vector<JobView>& jobs) {
     const bool hasUsers =
@@ -42,7 +30,7 @@ void printJobs(std::ostream& out, const std::vector<JobView>& jobs) {
     for (const JobView& job : jobs) {
         const std::optional<unsigned> percent = job.certainPercent();
         rows.push_back({job.id, orDash(labelOf(job.adapter, job.backend)), job.stateName(),
-                        percent ? std::to_string(*percent) : "-", startText(job)});
+                        percent ? std::to_string(*percent) : "-", momentText(job.start)});
     }
     for (std::size_t i = 0; i < rows.size(); ++i) {
         if (hasUsers) rows[i].push_back(i == 0 ? "USER" : orDash(jobs[i - 1].user));

@@ -23,11 +23,23 @@ struct Context {
     bool json = false;    ///< results, failures included, as one JSON document
     ProgressDisplay& progress;
     Following following;
+    /// Asks the user; tests put their own in.
+    std::function<decltype(askOnTerminal)> ask = askOnTerminal;
+};
+
+/// Which records of the history are wanted, as the user says it.
+struct HistoryOptions {
+    std::string adapter;
+    bool failedOnly = false;
+    bool asLines = false;
+    std::string since;
+    std::string after;
 };
 
 /// The options and arguments of all verbs; each verb looks at its own.
 struct VerbOptions {
-    UpdateOptions update;            ///< install, check; of activate the target
+    UpdateOptions update;            ///< install, check; of activate and rollback the target
+    ManyOptions many;                ///< install, on several adapters
     std::string job;                 ///< delete: its id, the number at the end of that, or its path
     std::string className;           ///< instances
     std::string path;                ///< associators, references
@@ -35,7 +47,9 @@ struct VerbOptions {
     bool namesOnly = false;          ///< instances, associators, references
     bool pendingOnly = false;        ///< adapters
     bool mayDisrupt = false;         ///< activate
+    std::string adapter;             ///< release
     RegistrationOptions registration;
+    HistoryOptions history;  ///< history
 };
 
 using Verb = ExitStatus (*)(Context& context, const VerbOptions& options);
@@ -44,7 +58,9 @@ ExitStatus showAdapters(Context& context, const VerbOptions& options);
 ExitStatus showIdentities(Context& context, const VerbOptions& options);
 
 ExitStatus install(Context& context, const VerbOptions& options);
-/// On a server only an image that the inventory offers, with neither types nor force.
+/// Installs the image that the adapter had before, by the history. Only in process.
+ExitStatus rollback(Context& context, const VerbOptions& options);
+/// On a server other than quenx-cimd only an image that the inventory offers, with neither types nor force.
 ExitStatus check(Context& context, const VerbOptions& options);
 /// Only in process.
 ExitStatus activate(Context& context, const VerbOptions& options);
@@ -52,6 +68,14 @@ ExitStatus activate(Context& context, const VerbOptions& options);
 /// Both need a server: jobs of this program's own end with it.
 ExitStatus showJobs(Context& context, const VerbOptions& options);
 ExitStatus deleteJob(Context& context, const VerbOptions& options);
+
+/// What the adapters were asked to install.
+ExitStatus showHistory(Context& context, const VerbOptions& options);
+/// Who holds which adapter, and how its last update ended, as far as the server tells; in process, who writes
+/// to it.
+ExitStatus showStatus(Context& context, const VerbOptions& options);
+/// Needs a server that is quenx-cimd.
+ExitStatus releaseAdapter(Context& context, const VerbOptions& options);
 
 ExitStatus showInstances(Context& context, const VerbOptions& options);
 ExitStatus showAssociators(Context& context, const VerbOptions& options);

@@ -16,7 +16,7 @@ struct Arguments {
     ServerSettings server;  ///< without a URL: the providers run in this process
 
     /// The verb may start one, so must not be ended half-way.
-    bool startsUpdate() const { return verb == install || verb == activate; }
+    bool startsUpdate() const { return verb == install || verb == rollback || verb == activate; }
 };
 
 /// Reads the command line. Nothing when it only asked for help or the version, which has been printed then.

@@ -1,0 +1,74 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "Cli/Update/PastImages.h"
+
+#include <unistd.h>
+
+#include "History/History.h"
+#include "History/KeptImages.h"
+#include "History/Look.h"
+
+namespace cli {
+
+namespace {
+
+using history::Record;
+
+/// The newest first.
+std::vector<Record> recordsOf(const Connection& connection, const Adapter& adapter, std::int64_t most) try {
+    if (connection.history == nullptr) return {};
+    return connection.history->find({.adapter = adapter.name, .most = most});
+} catch (const history::HistoryError& error) {
+    throw CommandError(ExitStatus::Failed, std::string("The history cannot be read: ") + error.what() + ".",
+                       "");
+}
+
+/// The slot may have had another card.
+bool isOfThisCard(const Record& record, const history::AdapterLook& look) {
+    return record.serial == look.serial;
+}
+
+}  // namespace
+
+PastImages pastImagesOf(const Connection& connection, const Adapter& adapter) {
+    PastImages past;
+    constexpr std::int64_t kMost = 1000;
+    const std::vector<Record> records = recordsOf(connection, adapter, kMost);
+    const auto look = records.empty() ? std::nullopt : history::lookAt(adapter.name);
+    if (!look) return past;
+    // What was broken off or failed may have left anything in the flash.
+    bool isUnchanged = true;
+    for (const Record& record : records) {
+        if (!isOfThisCard(record, *look) || record.outcome == history::kRefused) continue;
+        const bool isWritten = record.outcome == history::kWritten;
+        if (!past.last && !isWritten) isUnchanged = false;
+        if (!isWritten || record.sha256.empty()) continue;
+        if (!past.last) {
+            past.last = record;
+        } else if (record.sha256 != past.last->sha256) {
+            past.before = record;
+            break;
+        }
+    }
+    past.isUnchanged = isUnchanged && past.last && !past.last->versionsAfter.empty() &&
+                       past.last->versionsAfter == look->stored;
+    return past;
+}
+
+bool isLastWritten(const Connection& connection, const Candidate& candidate) try {
+    if (!candidate.image || candidate.image->problem) return false;
+    const PastImages past = pastImagesOf(connection, candidate.adapter);
+    // Of some of its types the others may be missing.
+    return past.isUnchanged && past.last->optionValues == joined(candidate.types, "+") &&
+           history::hasSum(candidate.image->path, past.last->sha256, past.last->bytes.value_or(0));
+} catch (const CommandError&) {
+    return false;
+}
+
+std::int64_t ownRecordOf(const Connection& connection, const Adapter& adapter) try {
+    const std::vector<Record> records = recordsOf(connection, adapter, 1);
+    return records.empty() || records.front().process != ::getpid() ? 0 : records.front().id;
+} catch (const CommandError&) {
+    return 0;
+}
+
+}  // namespace cli

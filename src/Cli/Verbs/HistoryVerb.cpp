@@ -1,0 +1,170 @@
+// SPDX-License-Identifier: Apache-2.0
+// What the adapters of this machine were asked to install.
+#include <array>
+#include <cstdio>
+#include <ctime>
+
+#include "Cli/Display/Output.h"
+#include "Cli/Update/ServedLog.h"
+#include "Cli/Verbs/Verbs.h"
+#include "Utils/Utils.h"
+
+namespace cli {
+
+namespace {
+
+using history::Record;
+
+constexpr std::int64_t kSecond = 1'000'000;  // microseconds
+
+/// "2026-11-22 16:20:03 +0100" in the local zone.
+std::string localText(std::int64_t microseconds) {
+    const auto seconds = static_cast<std::time_t>(microseconds / kSecond);
+    std::tm time{};
+    if (localtime_r(&seconds, &time) == nullptr) return "-";
+    std::array<char, sizeof "9999-12-31 23:59:59 +0000"> text{};
+    return {text.data(), std::strftime(text.data(), text.size(), "%Y-%m-%d %H:%M:%S %z", &time)};
+}
+
+/// "2026-11-22T15:20:03.123456Z"; null for none.
+Json utcText(const Record::Number& microseconds) {
+    if (!microseconds) return nullptr;
+    const auto seconds = static_cast<std::time_t>(*microseconds / kSecond);
+    std::tm time{};
+    if (gmtime_r(&seconds, &time) == nullptr) return nullptr;
+    return utils::formatStr("%04d-%02d-%02dT%02d:%02d:%02d.%06dZ", time.tm_year + 1900, time.tm_mon + 1,
+                            time.tm_mday, time.tm_hour, time.tm_min, time.tm_sec,
+                            static_cast<int>(*microseconds % kSecond));
+}
+
+/// Minutes east of UTC in "Z", "+01:00" or "-0130"; nothing for another text.
+std::optional<int> zoneOf(const std::string& text) {
+    if (text == "Z" || text == "z") return 0;
+    char sign = 0;
+    int hours = 0;
+    int minutes = 0;
+    int length = 0;
+    const bool isRead = std::sscanf(text.c_str(), "%c%2d:%2d%n", &sign, &hours, &minutes, &length) == 3 ||
+                        std::sscanf(text.c_str(), "%c%2d%2d%n", &sign, &hours, &minutes, &length) == 3;
+    if (!isRead || static_cast<std::size_t>(length) != text.size() || (sign != '+' && sign != '-')) return {};
+    return (sign == '-' ? -1 : 1) * (hours * 60 + minutes);
+}
+
+std::int64_t timeOf(const std::string& text) {
+    std::string plain = text;
+    utils::replaceCharacter(plain, ' ', 'T');
+    for (const char* format : {"%Y-%m-%dT%H:%M:%S", "%Y-%m-%dT%H:%M", "%Y-%m-%d"}) {
+        std::tm time{};
+        time.tm_isdst = -1;  // as the zone has it at that time
+        const char* rest = ::strptime(plain.c_str(), format, &time);
+        if (rest == nullptr) continue;
+        if (*rest == '\0') return std::int64_t{::mktime(&time)} * kSecond;
+        if (const auto zone = zoneOf(rest)) return (std::int64_t{::timegm(&time)} - *zone * 60) * kSecond;
+    }
+    throw CommandError(ExitStatus::WrongUse, "--since is \"" + text + "\", which is no time.",
+                       "Write it as 2026-11-22 or 2026-11-22T16:00, with Z or +01:00 for a zone.");
+}
+
+history::Filter filterOf(const HistoryOptions& options) {
+    history::Filter filter;
+    filter.adapter = options.adapter;
+    // The domain 0 is left out elsewhere, too.
+    const bool isShort = options.adapter.size() == 7 && options.adapter[2] == ':';
+    if (isShort) filter.adapter = "0000:" + options.adapter;
+    filter.failedOnly = options.failedOnly;
+    if (!options.since.empty()) filter.since = timeOf(options.since);
+    if (options.after.empty()) return filter;
+    filter.after = utils::parseNumber<std::int64_t>(options.after);
+    if (!filter.after)
+        throw CommandError(ExitStatus::WrongUse, "--after is \"" + options.after + "\", which is no id.",
+                           "Give it the id of a record, a whole number.");
+    return filter;
+}
+
+/// "active" for firmware that was seen to run.
+std::string outcomeText(const Record& record) {
+    return record.active ? "active" : record.outcome;
+}
+
+std::string detailsOf(const Record& record) {
+    if (record.isRunning()) return std::to_string(record.percent.value_or(0)) + " %";
+    if (record.isFailure()) return record.reason;
+    return record.versionsBefore + " -> " +
+           (record.versionsAfter.empty() ? record.imageVersions : record.versionsAfter);
+}
+
+std::string userText(const Record& record) {
+    const bool isHere = record.address.empty() || record.address == "local";
+    return isHere ? record.user : record.user + " at " + record.address;
+}
+
+void printRecords(std::ostream& out, const std::vector<Record>& records) {
+    std::vector<std::vector<std::string>> rows{
+        {"ID", "TIME", "ADAPTER", "OUTCOME", "USER", "THROUGH", "IMAGE", "DETAILS"}};
+    const auto orDash = [](const std::string& text) { return text.empty() ? "-" : text; };
+    for (const Record& record : records) {
+        rows.push_back({std::to_string(record.id), localText(record.begun),
+                        orDash(labelOf(record.adapter, record.backend)), outcomeText(record),
+                        orDash(userText(record)), orDash(record.front),
+                        orDash(record.uri.substr(record.uri.rfind('/') + 1)), detailsOf(record)});
+    }
+    printTable(out, rows);
+}
+
+Json jsonOf(const Record& record) {
+    const auto orNull = [](const std::string& text) { return text.empty() ? Json() : Json(text); };
+    const auto number = [](const Record::Number& value) { return value ? Json(*value) : Json(); };
+    return {{"id", record.id},
+            {"begun", utcText(record.begun)},
+            {"ended", utcText(record.ended)},
+            {"durationMicroseconds", number(record.duration)},
+            {"outcome", record.outcome},
+            {"active", utcText(record.active)},
+            {"percentComplete", number(record.percent)},
+            {"returnValue", number(record.returnValue)},
+            {"errorCode", number(record.errorCode)},
+            {"reason", orNull(record.reason)},
+            {"user", orNull(record.user)},
+            {"address", orNull(record.address)},
+            {"front", orNull(record.front)},
+            {"process", record.process == 0 ? Json() : Json(record.process)},  // a server does not tell
+            {"boot", orNull(record.boot)},
+            {"host", orNull(record.host)},
+            {"target", orNull(record.target)},
+            {"adapter", orNull(record.adapter)},
+            {"backend", orNull(record.backend)},
+            {"pciAddress", orNull(record.pciAddress)},
+            {"serialNumber", orNull(record.serial)},
+            {"uri", orNull(record.uri)},
+            {"sha256", orNull(record.sha256)},
+            {"bytes", number(record.bytes)},
+            {"imageVersions", orNull(record.imageVersions)},
+            {"types", orNull(record.types)},
+            {"options", orNull(record.options)},
+            {"optionValues", orNull(record.optionValues)},
+            {"versionsBefore", orNull(record.versionsBefore)},
+            {"versionsAfter", orNull(record.versionsAfter)},
+            {"job", orNull(record.job)}};
+}
+
+}  // namespace
+
+ExitStatus showHistory(Context& context, const VerbOptions& options) {
+    const std::vector<Record> records = readHistory(context.connection, filterOf(options.history));
+    if (options.history.asLines) {
+        for (const Record& record : records)
+            context.out << jsonOf(record).dump() << '\n';
+    } else if (context.json) {
+        Json list = Json::array();
+        for (const Record& record : records)
+            list.push_back(jsonOf(record));
+        printJson(context.out, {{"records", list}});
+    } else if (records.empty()) {
+        context.out << "There are no records.\n";
+    } else {
+        printRecords(context.out, records);
+    }
+    return ExitStatus::Done;
+}
+
+}  // namespace cli
