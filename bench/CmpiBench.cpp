@@ -3,10 +3,7 @@
 // the tests, which forgets what it is given here: what it would do with it is not the front's cost.
 #include <benchmark/benchmark.h>
 
-#include <atomic>
-#include <cstdlib>
-#include <new>
-
+#include "Allocations.h"
 #include "Cmpi/LoadedFront.h"
 #include "Framework/Requests/CimRequests.h"
 #include "InstantAdapters.h"
@@ -14,7 +11,6 @@
 namespace {
 
 constexpr const char* kClass = "Quenx_EthernetPort";
-std::atomic<std::size_t> allocations{0};
 
 class Host {
   public:
@@ -45,13 +41,13 @@ class Host {
 template <class Enumerate>
 void enumerate(benchmark::State& state, Host& host, Enumerate enumerateOnce) {
     const auto ports = static_cast<double>(state.range(0));
-    const std::size_t before = allocations;
+    const std::size_t before = bench::allocations();
     for (auto _ : state) {
         if (enumerateOnce(host) != static_cast<std::size_t>(state.range(0)))
             state.SkipWithError("ports are missing");
     }
     state.counters["allocations/instance"] =
-        static_cast<double>(allocations - before) / static_cast<double>(state.iterations()) / ports;
+        static_cast<double>(bench::allocations() - before) / static_cast<double>(state.iterations()) / ports;
 }
 
 void inProcess(benchmark::State& state) {
@@ -71,16 +67,3 @@ BENCHMARK_CAPTURE(throughFront, pegasus, test::Dialect::Pegasus)
     ->Unit(benchmark::kMicrosecond);
 
 }  // namespace
-
-// Counted for the libraries, too.
-[[gnu::noinline]] void* operator new(std::size_t size) {
-    allocations.fetch_add(1, std::memory_order_relaxed);
-    if (void* memory = std::malloc(size)) return memory;
-    throw std::bad_alloc();
-}
-[[gnu::noinline]] void operator delete(void* memory) noexcept {
-    std::free(memory);
-}
-[[gnu::noinline]] void operator delete(void* memory, std::size_t) noexcept {
-    std::free(memory);
-}

@@ -63,9 +63,13 @@ class InstantBackend : public ma::Backend {
 
 }  // namespace
 
-InstantAdapters::InstantAdapters(std::size_t ports)
+InstantAdapters::InstantAdapters(std::size_t ports, std::size_t images)
     : m_config(m_folder.write("provider.conf", "FWFilePath=" + m_folder.path() + "\n" + kSettings)),
       m_imageUri("file://" + m_folder.write("image.rom", test::madeRom({{utils::FirmwareType::PXE, 2}}))) {
+    for (std::uint32_t i = 1; i < images; ++i) {
+        m_folder.write("image" + std::to_string(i) + ".rom",
+                       test::madeRom({{utils::FirmwareType::PXE, 2 + i}}));
+    }
     utils::logLevel = 0;  // what is measured is not the system log
     m_previous = ma::setBackend(std::make_shared<InstantBackend>(ports));
 }

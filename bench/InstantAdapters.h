@@ -14,13 +14,14 @@ namespace bench {
 /// Four ports to a card. Stands in for the process's backend while it lives, with a configuration of its own.
 class InstantAdapters {
   public:
-    explicit InstantAdapters(std::size_t ports);
+    /// @param images  how many image files the inventory serves, each another firmware
+    explicit InstantAdapters(std::size_t ports, std::size_t images = 1);
     ~InstantAdapters();
     InstantAdapters(const InstantAdapters&) = delete;
     InstantAdapters& operator=(const InstantAdapters&) = delete;
 
     static std::string portName(std::size_t index);
-    /// A one-kilobyte image, which every adapter takes and the inventory serves.
+    /// The first of the images, of one kilobyte, which every adapter takes.
     const std::string& imageUri() const { return m_imageUri; }
 
   private:
