@@ -1,7 +1,7 @@
 #!/usr/bin/env bash
 # SPDX-License-Identifier: Apache-2.0
-# Runs a command, in this folder, that can write to nothing but the named folders, devices, and a /tmp of its own that
-# is empty at first and gone at the end: an attempt to write elsewhere fails. Needs root.
+# Runs a command, in this folder, that can write to nothing but the named folders, devices, and a /tmp and a /dev/shm of
+# its own that are empty at first and gone at the end: an attempt to write elsewhere fails. Needs root.
 #
 #   tools/contained.sh FOLDER... -- COMMAND...
 set -euo pipefail
@@ -31,6 +31,7 @@ done
 shift
 
 mount -t tmpfs -o mode=1777 tmpfs /tmp
+[ ! -d /dev/shm ] || mount -t tmpfs -o mode=1777 tmpfs /dev/shm
 for i in "${!folders[@]}"; do
     mkdir -p "${folders[i]}"
     mount --no-canonicalize --rbind "/proc/self/fd/${opened[i]}" "${folders[i]}"
