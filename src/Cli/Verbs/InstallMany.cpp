@@ -29,11 +29,10 @@ std::vector<Component> versionsAfter(const Candidate& candidate) {
 }
 
 /// What would become of a candidate that is to be written.
-Outcome judge(const Connection& connection, Candidate candidate) {
+Outcome judge(const Connection& connection, const Candidate& candidate) {
     Outcome outcome(candidate);
-    // To check an identity would hold the adapter, on a server until it is restarted.
-    candidate.identity = {};
-    if (connection.isInProcess) outcome.returnValue = verifyOnly(connection, candidate);
+    // A file that would be sent is not where the server could look at it.
+    if (candidate.localFile.empty()) outcome.returnValue = verifyOnly(connection, candidate);
     if (outcome.returnValue.value_or(MethodReturn::Completed) != MethodReturn::Completed) {
         outcome.end(Ending::Refused, explainRefusal(connection, *outcome.returnValue, candidate));
         return outcome;
