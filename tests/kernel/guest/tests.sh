@@ -207,6 +207,18 @@ test_daemon() {
     no_image_is_left
 }
 
+# The unit lets it write to little: the folder of what is sent is among that, and so is its history.
+test_image_sent_to_the_daemon() {
+    start_daemon
+    sent="$(image 2.15.0)"
+    quenxctl --server unix: install --target $C --upload "$sent"
+    same "$(version $C stored fw)" 2.15.0
+    cmp "$sent" /var/lib/quenx/images/*/2.15.0.bin
+    systemctl stop quenx-cimd
+    has "$(quenxctl history)" "quenx-cimd  2.15.0.bin"
+    no_image_is_left
+}
+
 test_another_tool_on_the_card() {
     start_daemon
     quenxctl --server unix: adapters # from here on it hears of flashes
