@@ -114,6 +114,16 @@ void checkAdapters(const Settings& settings) {
     if (!settings.adapterState.empty()) requireWritable(settings.adapterState, "Check adapters.state.");
 }
 
+/// A start goes on without a folder for images that are sent, so this is no error.
+void checkUploads(const UploadSettings& settings) try {
+    const bool isSet = settings.directory != UploadSettings{}.directory;
+    if (settings.directory.empty() || (!isSet && !fs::exists(settings.directory))) return;
+    // Of a file in the folder, so that the folder has to be one.
+    requireWritable(settings.directory + "/image", "Set uploads.directory to another folder, or to \"\".");
+} catch (const std::exception& error) {
+    warn(std::string("No images are taken: ") + error.what());
+}
+
 }  // namespace
 
 int checkConfiguration(const Settings& settings) {
@@ -145,6 +155,7 @@ int checkConfiguration(const Settings& settings) {
     check([&] { utils::PolicyFile(settings.policy).current(); });
     check([&] { checkProviders(settings); });
     check([&] { checkAdapters(settings); });
+    checkUploads(settings.uploads);
     if (status == 0) std::cout << "The configuration is valid.\n";
     return status;
 }
