@@ -152,13 +152,17 @@ std::optional<std::uint32_t> ServerControl::checkImage(const std::string& uri, c
 std::optional<std::string> ServerControl::sendFile(const std::string& file, const std::string& image) {
     const FileToSend content(file);
     const std::string name = std::filesystem::path(file).filename().string();
-    const auto answer = call(
-        {.method = "PUT",
-         .path = std::string(control::kImages) + (image.empty() ? content.sum : image) + "/" + encoded(name),
-         .headers = {std::string(control::kSumHeader) + ": " + content.sum},
-         .file = content.file.number(),
-         .fileBytes = content.bytes});
-    return answer ? std::optional(valueOf<std::string>(*answer, "uri")) : std::nullopt;
+    const std::string place = (image.empty() ? content.sum : image) + "/" + encoded(name);
+    // For several adapters the same file is sent once.
+    const std::pair key(place, content.sum);
+    if (const auto sent = m_sent.find(key); sent != m_sent.end()) return sent->second;
+    const auto answer = call({.method = "PUT",
+                              .path = std::string(control::kImages) + place,
+                              .headers = {std::string(control::kSumHeader) + ": " + content.sum},
+                              .file = content.file.number(),
+                              .fileBytes = content.bytes});
+    if (!answer) return std::nullopt;
+    return m_sent[key] = valueOf<std::string>(*answer, "uri");
 }
 
 std::optional<std::string> ServerControl::upload(const std::string& file) {

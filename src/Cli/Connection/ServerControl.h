@@ -2,9 +2,11 @@
 #pragma once
 
 #include <cstdint>
+#include <map>
 #include <nlohmann/json_fwd.hpp>
 #include <optional>
 #include <string>
+#include <utility>
 #include <vector>
 
 #include "Cli/Connection/HttpClient.h"
@@ -51,6 +53,8 @@ class ServerControl {
     std::optional<std::string> sendFile(const std::string& file, const std::string& image);
 
     HttpClient m_client;
+    /// Where a file is on the server, by the place that was asked for and the sum of its content.
+    std::map<std::pair<std::string, std::string>, std::string> m_sent;
 };
 
 }  // namespace cli
