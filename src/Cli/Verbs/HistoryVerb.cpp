@@ -1,10 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
 // What the adapters of this machine were asked to install.
-#include <array>
 #include <cstdio>
 #include <ctime>
 
-#include "Cli/Display/Output.h"
+#include "Cli/Display/Records.h"
 #include "Cli/Update/ServedLog.h"
 #include "Cli/Verbs/Verbs.h"
 #include "Utils/Utils.h"
@@ -16,26 +15,6 @@ namespace {
 using history::Record;
 
 constexpr std::int64_t kSecond = 1'000'000;  // microseconds
-
-/// "2026-11-22 16:20:03 +0100" in the local zone.
-std::string localText(std::int64_t microseconds) {
-    const auto seconds = static_cast<std::time_t>(microseconds / kSecond);
-    std::tm time{};
-    if (localtime_r(&seconds, &time) == nullptr) return "-";
-    std::array<char, sizeof "9999-12-31 23:59:59 +0000"> text{};
-    return {text.data(), std::strftime(text.data(), text.size(), "%Y-%m-%d %H:%M:%S %z", &time)};
-}
-
-/// "2026-11-22T15:20:03.123456Z"; null for none.
-Json utcText(const Record::Number& microseconds) {
-    if (!microseconds) return nullptr;
-    const auto seconds = static_cast<std::time_t>(*microseconds / kSecond);
-    std::tm time{};
-    if (gmtime_r(&seconds, &time) == nullptr) return nullptr;
-    return utils::formatStr("%04d-%02d-%02dT%02d:%02d:%02d.%06dZ", time.tm_year + 1900, time.tm_mon + 1,
-                            time.tm_mday, time.tm_hour, time.tm_min, time.tm_sec,
-                            static_cast<int>(*microseconds % kSecond));
-}
 
 /// Minutes east of UTC in "Z", "+01:00" or "-0130"; nothing for another text.
 std::optional<int> zoneOf(const std::string& text) {
@@ -81,11 +60,6 @@ history::Filter filterOf(const HistoryOptions& options) {
     return filter;
 }
 
-/// "active" for firmware that was seen to run.
-std::string outcomeText(const Record& record) {
-    return record.active ? "active" : record.outcome;
-}
-
 std::string detailsOf(const Record& record) {
     if (record.isRunning()) return std::to_string(record.percent.value_or(0)) + " %";
     if (record.isFailure()) return record.reason;
@@ -103,48 +77,12 @@ void printRecords(std::ostream& out, const std::vector<Record>& records) {
         {"ID", "TIME", "ADAPTER", "OUTCOME", "USER", "THROUGH", "IMAGE", "DETAILS"}};
     const auto orDash = [](const std::string& text) { return text.empty() ? "-" : text; };
     for (const Record& record : records) {
-        rows.push_back({std::to_string(record.id), localText(record.begun),
+        rows.push_back({std::to_string(record.id), localTimeText(record.begun),
                         orDash(labelOf(record.adapter, record.backend)), outcomeText(record),
                         orDash(userText(record)), orDash(record.front),
                         orDash(record.uri.substr(record.uri.rfind('/') + 1)), detailsOf(record)});
     }
     printTable(out, rows);
-}
-
-Json jsonOf(const Record& record) {
-    const auto orNull = [](const std::string& text) { return text.empty() ? Json() : Json(text); };
-    const auto number = [](const Record::Number& value) { return value ? Json(*value) : Json(); };
-    return {{"id", record.id},
-            {"begun", utcText(record.begun)},
-            {"ended", utcText(record.ended)},
-            {"durationMicroseconds", number(record.duration)},
-            {"outcome", record.outcome},
-            {"active", utcText(record.active)},
-            {"percentComplete", number(record.percent)},
-            {"returnValue", number(record.returnValue)},
-            {"errorCode", number(record.errorCode)},
-            {"reason", orNull(record.reason)},
-            {"user", orNull(record.user)},
-            {"address", orNull(record.address)},
-            {"front", orNull(record.front)},
-            {"process", record.process == 0 ? Json() : Json(record.process)},  // a server does not tell
-            {"boot", orNull(record.boot)},
-            {"host", orNull(record.host)},
-            {"target", orNull(record.target)},
-            {"adapter", orNull(record.adapter)},
-            {"backend", orNull(record.backend)},
-            {"pciAddress", orNull(record.pciAddress)},
-            {"serialNumber", orNull(record.serial)},
-            {"uri", orNull(record.uri)},
-            {"sha256", orNull(record.sha256)},
-            {"bytes", number(record.bytes)},
-            {"imageVersions", orNull(record.imageVersions)},
-            {"types", orNull(record.types)},
-            {"options", orNull(record.options)},
-            {"optionValues", orNull(record.optionValues)},
-            {"versionsBefore", orNull(record.versionsBefore)},
-            {"versionsAfter", orNull(record.versionsAfter)},
-            {"job", orNull(record.job)}};
 }
 
 }  // namespace
@@ -153,11 +91,11 @@ ExitStatus showHistory(Context& context, const VerbOptions& options) {
     const std::vector<Record> records = readHistory(context.connection, filterOf(options.history));
     if (options.history.asLines) {
         for (const Record& record : records)
-            context.out << jsonOf(record).dump() << '\n';
+            context.out << Json(record).dump() << '\n';
     } else if (context.json) {
         Json list = Json::array();
         for (const Record& record : records)
-            list.push_back(jsonOf(record));
+            list.push_back(record);
         printJson(context.out, {{"records", list}});
     } else if (records.empty()) {
         context.out << "There are no records.\n";

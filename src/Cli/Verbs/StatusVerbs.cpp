@@ -3,7 +3,8 @@
 #include <algorithm>
 
 #include "Cli/Connection/ServerControl.h"
-#include "Cli/Display/Output.h"
+#include "Cli/Display/Records.h"
+#include "Cli/Update/ServedLog.h"
 #include "Cli/Verbs/Verbs.h"
 
 namespace cli {
@@ -13,9 +14,10 @@ namespace {
 /// All that is known of one adapter's updates.
 struct AdapterStatus {
     const Adapter& adapter;
-    const HeldAdapter* held = nullptr;  ///< null for none
-    const JobView* running = nullptr;   ///< likewise
-    const JobView* last = nullptr;      ///< that has ended; likewise
+    const HeldAdapter* held = nullptr;        ///< null for none
+    const JobView* running = nullptr;         ///< likewise
+    const JobView* last = nullptr;            ///< that has ended; likewise
+    const history::Record* record = nullptr;  ///< of the last attempt that has ended; likewise
 
     std::string holder() const {
         if (held != nullptr) return held->text();
@@ -32,8 +34,13 @@ struct AdapterStatus {
         const std::optional<unsigned> percent = running->certainPercent();
         return running->stateName() + (percent ? ", " + std::to_string(*percent) + " %" : "");
     }
-    /// "Completed (Quenx:FirmwareUpdate@Job#1 of 2026-11-21 20:10:33)"
+    /// "active (new.rom of 2026-11-21 20:10:33 +0100)" by the history, which knows more than the jobs; else
+    /// "Completed (Quenx:FirmwareUpdate@Job#1 of 2026-11-21 20:10:33)".
     std::string outcome() const {
+        if (record != nullptr) {
+            return outcomeText(*record) + " (" + record->uri.substr(record->uri.rfind('/') + 1) + " of " +
+                   localTimeText(record->begun) + ")" + (record->reason.empty() ? "" : ": " + record->reason);
+        }
         if (last == nullptr) return "-";
         return last->stateName() + " (" + last->id + " of " + momentText(last->start) + ")" +
                (last->errorDescription.empty() ? "" : ": " + last->errorDescription);
@@ -41,15 +48,22 @@ struct AdapterStatus {
 };
 
 void to_json(Json& json, const AdapterStatus& status) {
-    json = {{"name", status.adapter.name}, {"backend", status.adapter.backend}, {"claim", nullptr},
-            {"busy", status.adapter.busy}, {"writer", status.adapter.writer},   {"job", nullptr},
-            {"lastJob", nullptr}};
+    json = {{"name", status.adapter.name},
+            {"backend", status.adapter.backend},
+            {"claim", nullptr},
+            {"busy", status.adapter.busy},
+            {"writer", status.adapter.writer},
+            {"job", nullptr},
+            {"lastJob", nullptr},
+            {"lastUpdate", nullptr}};
     if (status.held != nullptr) json["claim"] = *status.held;
     if (status.running != nullptr) json["job"] = *status.running;
     if (status.last != nullptr) json["lastJob"] = *status.last;
+    if (status.record != nullptr) json["lastUpdate"] = *status.record;
 }
 
 std::vector<AdapterStatus> statusOf(const std::vector<Adapter>& adapters, const std::vector<JobView>& jobs,
+                                    const std::vector<history::Record>& records,
                                     const std::optional<HeldAdapter>& held) {
     std::vector<AdapterStatus> all;
     for (const Adapter& adapter : adapters) {
@@ -58,8 +72,24 @@ std::vector<AdapterStatus> statusOf(const std::vector<Adapter>& adapters, const 
         // Jobs are listed in the order in which they were started.
         for (const JobView& job : jobs)
             if (job.adapter == adapter.name) (job.hasEnded() ? status.last : status.running) = &job;
+        // The newest comes first.
+        const auto found = std::ranges::find_if(records, [&adapter](const history::Record& record) {
+            return record.adapter == adapter.name && !record.isRunning();
+        });
+        if (found != records.end()) status.record = &*found;
     }
     return all;
+}
+
+/// None where nobody keeps them, or a server does not serve them.
+std::vector<history::Record> recordsOf(const Connection& connection) try {
+    return readHistory(connection, {});
+} catch (const NoAnswer&) {
+    throw;
+} catch (const CommandError&) {
+    return {};
+} catch (const core::CimError&) {
+    return {};
 }
 
 void printStatus(std::ostream& out, const std::vector<AdapterStatus>& all) {
@@ -92,7 +122,8 @@ ExitStatus showStatus(Context& context, const VerbOptions&) {
     const std::vector<JobView> jobs =
         connection.isInProcess ? std::vector<JobView>() : readJobs(*connection.operations);
     const auto held = connection.control == nullptr ? std::nullopt : connection.control->held();
-    const std::vector<AdapterStatus> all = statusOf(adapters, jobs, held);
+    const std::vector<history::Record> records = recordsOf(connection);
+    const std::vector<AdapterStatus> all = statusOf(adapters, jobs, records, held);
     if (context.json) {
         printJson(context.out, {{"adapters", all}, {"claimsTold", connection.isInProcess || held}});
         return ExitStatus::Done;
