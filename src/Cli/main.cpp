@@ -15,6 +15,7 @@
 
 #include "Cli/Arguments/Arguments.h"
 #include "Cli/Display/Output.h"
+#include "Framework/Requests/NotedCall.h"
 #include "Framework/Requests/PolicyDecision.h"
 #include "Utils/Os/Linux/linux.h"
 
@@ -91,10 +92,14 @@ ExitStatus statusFor(core::CimStatus status) {
     return isMissing ? ExitStatus::NotFound : ExitStatus::Failed;
 }
 
-ExitStatus report(bool json, ExitStatus status, const std::string& what, const std::string& advice) {
+/// @param reason  of a refusal that has one
+ExitStatus report(bool json, ExitStatus status, const std::string& what, const std::string& advice,
+                  core::ReasonId reason = core::ReasonId::None) {
     // On standard output: a script reads its one document there, however the verb ended.
     if (json) {
-        printJson(std::cout, {{"error", what}, {"advice", advice}, {"exitStatus", static_cast<int>(status)}});
+        Json error = {{"error", what}, {"advice", advice}, {"exitStatus", static_cast<int>(status)}};
+        if (reason != core::ReasonId::None) error["reasonId"] = core::reasonCode(reason);
+        printJson(std::cout, error);
         return status;
     }
     std::cerr << "quenxctl: " << printable(what) << '\n';
@@ -136,13 +141,15 @@ ExitStatus runVerb(const Arguments& arguments) {
 /// @param arguments  set once they are read
 ExitStatus runAndReport(int argc, char** argv, std::optional<Arguments>& arguments) {
     const bool json = asksForJson(argc, argv);
+    const core::NotedCall noted;
     try {
         arguments = readArguments(argc, argv);
         return arguments ? runVerb(*arguments) : ExitStatus::Done;
     } catch (const CommandError& error) {
         return report(json, error.status(), error.what(), error.advice());
     } catch (const core::CimError& error) {
-        return report(json, statusFor(error.status()), sentence(error.what()), adviceFor(error));
+        return report(json, statusFor(error.status()), sentence(error.what()), adviceFor(error),
+                      noted.notes().reason);
     } catch (const std::exception& error) {
         return report(json, ExitStatus::Failed, sentence(error.what()), kAskLog);
     }

@@ -126,10 +126,13 @@ void Request::audited(const std::string& operation, const std::vector<core::Argu
     core::CimPath target = m_object;
     target.setNamespace(m_place.requested);
     core::AuditEvent event{core::CallerScope::current(), operation, target.toString(), ""};
+    const core::NotedCall noted;
     try {
         event.outcome = work();
+        event.notes = noted.notes();
     } catch (const CimError& error) {
         event.outcome = core::outcomeOf(error.status(), error.what());
+        event.notes = noted.notes();
         core::audit(event, arguments);
         throw;
     }

@@ -12,6 +12,8 @@ namespace control {
 inline constexpr std::string_view kRoot = "/quenx/v1/";
 inline constexpr const char* kHeader = "Quenx-Interface";
 inline constexpr const char* kVersion = "1";
+/// "QX-0123": why a call was refused. On answers to CIM-XML, too, whose messages have no place for it.
+inline constexpr const char* kReasonHeader = "Quenx-Reason";
 
 /// GET: {"claim": null} or {"claim": {"adapter", "holder", "user", "job", "since"}}. `holder` is one of the
 /// three below; `since` is a CIM datetime; `user` is null for those who may only read.

@@ -92,23 +92,29 @@ class History::Update : public core::UpdateRecord {
     Update(Process& process, std::shared_ptr<RunningUpdate> update, std::uint64_t since)
         : m_process(process), m_update(std::move(update)), m_since(since) {}
     ~Update() override {
-        if (!m_hasEnded) finishAs(kFailed, 0, "The update did not take place");
+        if (!m_hasEnded)
+            finishAs(kFailed, core::ReasonId::WorkerNotStarted, 0, "The update did not take place");
     }
 
     void end(bool succeeded, std::uint32_t code, const std::string& text) noexcept override {
         m_hasEnded = true;
-        finishAs(succeeded ? kWritten : kFailed, code, text);
+        if (succeeded)
+            finishAs(kWritten, core::ReasonId::None, code, text);
+        else
+            finishAs(kFailed, core::reasonOfErrorCode(code), code, text);
     }
 
   private:
-    void finishAs(const char* outcome, std::uint32_t code, const std::string& reason) noexcept try {
+    void finishAs(const char* outcome, core::ReasonId reason, std::uint32_t code,
+                  const std::string& text) noexcept try {
         // By value, since the task may run when nobody waits for it any more.
-        const auto task = [keeper = m_process.keeper, update = m_update, since = m_since, outcome, code,
-                           reason] {
+        const auto task = [keeper = m_process.keeper, update = m_update, since = m_since, outcome, reason,
+                           code, text] {
             Record& record = update->record;
             record.outcome = outcome;
             record.errorCode = code;
-            record.reason = cut(reason);
+            record.reason = cut(text);
+            record.reasonId = core::reasonCode(reason);
             if (record.outcome == kWritten) record.percent = 100;
             finish(record, since);
             keeper->end(update);
@@ -162,11 +168,12 @@ std::future<core::ImageFacts> History::examine(std::span<const std::uint8_t> fil
     return {};
 }
 
-void History::refused(const core::UpdateAttempt& attempt, unsigned int returnValue,
-                      const std::string& reason) noexcept try {
+void History::refused(const core::UpdateAttempt& attempt, unsigned int returnValue, core::ReasonId reason,
+                      const std::string& text) noexcept try {
     Record record = recordOf(attempt);
     record.outcome = kRefused;
-    record.reason = cut(reason);
+    record.reason = cut(text);
+    record.reasonId = core::reasonCode(reason);
     if (returnValue != 0) record.returnValue = returnValue;
     finish(record, attempt.monotonic);
     Process& own = process();

@@ -33,8 +33,8 @@ class History : public core::UpdateSink {
     ~History() override;
 
     std::future<core::ImageFacts> examine(std::span<const std::uint8_t> file) noexcept override;
-    void refused(const core::UpdateAttempt& attempt, unsigned int returnValue,
-                 const std::string& reason) noexcept override;
+    void refused(const core::UpdateAttempt& attempt, unsigned int returnValue, core::ReasonId reason,
+                 const std::string& text) noexcept override;
     std::string problem() override;
     std::shared_ptr<core::UpdateRecord> begin(const core::UpdateAttempt& attempt) noexcept override;
 

@@ -5,6 +5,7 @@
 #include <filesystem>
 
 #include "Framework/Requests/Audit.h"
+#include "Framework/Requests/Reasons.h"
 #include "History/KeptImages.h"
 #include "History/Look.h"
 #include "MidAPI/Image/OptionRom.h"
@@ -32,6 +33,7 @@ void identify(Record& record, const AdapterLook& look) {
 /// What nobody lived to see the end of. It is not begun again: only people know whether they still want it.
 void completeInterrupted(Record& record) {
     record.outcome = kInterrupted;
+    record.reasonId = core::reasonCode(core::ReasonId::Interrupted);
     record.ended = now();
     record.reason = "Interrupted at " + std::to_string(record.percent.value_or(0)) + " %: " + record.front +
                     " (process " + std::to_string(record.process) + ") ended during the update. " +

@@ -21,14 +21,15 @@ struct Record {
 
     std::int64_t id = 0;  ///< rises with each record, and is never given twice
     std::int64_t begun = 0;
-    Number ended;         ///< of an interrupted one, when somebody found it
-    Number active;        ///< when the firmware was first seen to run
-    Number duration;      ///< microseconds from the call to the end
-    std::string outcome;  ///< one of the texts above
-    Number returnValue;   ///< of the method, where it was refused
-    Number errorCode;     ///< of the adapter API, at the end of the flash
-    std::string reason;   ///< in words, of what was not written
-    Number percent;       ///< the progress, as it was last seen
+    Number ended;          ///< of an interrupted one, when somebody found it
+    Number active;         ///< when the firmware was first seen to run
+    Number duration;       ///< microseconds from the call to the end
+    std::string outcome;   ///< one of the texts above
+    Number returnValue;    ///< of the method, where it was refused
+    Number errorCode;      ///< of the adapter API, at the end of the flash
+    std::string reason;    ///< in words, of what was not written
+    std::string reasonId;  ///< "QX-0123"
+    Number percent;        ///< the progress, as it was last seen
     std::string user;
     std::string address;
     std::string front;  ///< the program that carried it out

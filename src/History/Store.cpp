@@ -60,11 +60,12 @@ constexpr Column kColumns[] = {
     {"versions_before", &Record::versionsBefore},
     {"versions_after", &Record::versionsAfter},
     {"job", &Record::job},
+    {"reason_id", &Record::reasonId},
 };
 constexpr int kColumnCount = static_cast<int>(std::size(kColumns));
 
-/// What nothing fills yet: a stable id of the reason, and the key that an image was signed with.
-constexpr const char* kUnfilledColumns = ", reason_id TEXT, signed_by TEXT";
+/// What nothing fills yet: the key that an image was signed with.
+constexpr const char* kUnfilledColumn = ", signed_by TEXT";
 
 /// Each query below has one that holds just the rows that it wants.
 constexpr const char* kIndexes =
@@ -88,7 +89,7 @@ std::string tableSql() {
         const bool isText = std::holds_alternative<std::string Record::*>(column.field);
         sql += std::string(", ") + column.name + (isText ? " TEXT" : " INTEGER");
     }
-    return sql + kUnfilledColumns + ");" + kIndexes;
+    return sql + kUnfilledColumn + ");" + kIndexes;
 }
 
 /// Binds the columns, in their order, as the parameters from 1 on.

@@ -29,7 +29,7 @@ std::string page() {
         "| id | what happened | what to do | return value | error code |\n|---|---|---|---|---|\n";
     const auto number = [](const auto& value) { return value ? std::to_string(*value) : ""; };
     for (const Reason& reason : core::allReasons())
-        text += "| " + reason.code() + " | " + reason.text + " | " + reason.advice + " | " +
+        text += "| " + core::reasonCode(reason.id) + " | " + reason.text + " | " + reason.advice + " | " +
                 number(reason.returnValue) + " | " + number(reason.errorCode) + " |\n";
     return text;
 }
@@ -55,6 +55,10 @@ TEST(ReasonsTest, NamesEachCauseOnce) {
 TEST(ReasonsTest, CodesHaveFourDigits) {
     EXPECT_EQ(core::reasonCode(ReasonId::OptionsNotSupported), "QX-0102");
     EXPECT_EQ(core::reasonCode(ReasonId::None), "");
+    for (const char* code : {"QX-0102", "QX-9999"})
+        EXPECT_EQ(core::reasonCode(core::parseReasonCode(code)), code);
+    for (const char* other : {"", "0102", "QX-", "QX-99999", "QX-01x"})
+        EXPECT_EQ(core::parseReasonCode(other), ReasonId::None) << other;
     EXPECT_EQ(core::reasonOfErrorCode(5), ReasonId::FlashBusy);
     constexpr std::uint32_t kNoSpace = 28;  // a device's own number
     EXPECT_EQ(core::reasonOfErrorCode(kNoSpace), ReasonId::FlashFailed);

@@ -69,14 +69,15 @@ class HistoryTest : public ::testing::Test {
 TEST_F(HistoryTest, KeepsARefusalAndAnUpdateForThisUserAlone) {
     {
         History history(settings());
-        history.refused(attempt(), 5, "it was wrong");
+        history.refused(attempt(), 5, core::ReasonId::ImageDamaged, "it was wrong");
         update(history);
         const auto given = history.begin(attempt());  // and no end
     }
     const std::vector<Record> found = records();
     ASSERT_EQ(found.size(), 3U);
     const Record& refused = found[2];
-    EXPECT_EQ(refused.outcome + ", " + refused.reason, "refused, it was wrong");
+    EXPECT_EQ(refused.outcome + ", " + refused.reason + ", " + refused.reasonId,
+              "refused, it was wrong, QX-0301");
     EXPECT_EQ(refused.returnValue, 5);
     const Record& written = found[1];
     EXPECT_EQ(written.outcome, "written");
@@ -86,7 +87,7 @@ TEST_F(HistoryTest, KeepsARefusalAndAnUpdateForThisUserAlone) {
     EXPECT_EQ(written.versionsBefore + " / " + written.imageVersions, "IMG_PXE 1, IMG_UEFI 0 / IMG_PXE 2");
     EXPECT_EQ(written.sha256 + " " + written.options, "abc 5,3");
     EXPECT_TRUE(written.active && written.ended && written.duration);
-    EXPECT_EQ(found[0].reason, "The update did not take place");
+    EXPECT_EQ(found[0].reason + ", " + found[0].reasonId, "The update did not take place, QX-0405");
     for (const auto& [path, mode] : {std::pair{m_path, 0700U}, {m_file, 0600U}, {m_path + "/lock", 0600U}}) {
         struct stat status {};
         EXPECT_EQ(::stat(path.c_str(), &status), 0) << path;
@@ -136,14 +137,14 @@ TEST_F(HistoryTest, TakesTheRecordsOfTwoProcessesAndRemovesTheOldest) {
     const pid_t child = ::fork();
     std::optional<History> history(settings());
     for (int i = 0; i < kEach; ++i)
-        history->refused(attempt(), 2, child == 0 ? "child" : "parent");
+        history->refused(attempt(), 2, core::ReasonId::FileNotRead, child == 0 ? "child" : "parent");
     if (child == 0) {
         history.reset();
         ::_exit(0);
     }
     ::waitpid(child, nullptr, 0);
     for (int i = 0; i < 2; ++i)
-        history->refused(attempt(), 2, "parent");
+        history->refused(attempt(), 2, core::ReasonId::FileNotRead, "parent");
     const std::vector<Record> found = history->find({});
     // Whenever there are more than a hundred, two go.
     EXPECT_EQ(found.front().id, 2 * kEach + 2);
@@ -191,7 +192,7 @@ TEST_P(TroubledHistoryTest, StopsNoUpdateAndIsToldOnce) {
     {
         History history(settings());
         update(history);
-        history.refused(attempt(), 2, "again");
+        history.refused(attempt(), 2, core::ReasonId::FileNotRead, "again");
     }
     EXPECT_EQ(test::SyslogCapture::count(GetParam().said), 1U);
     if (GetParam().recordsAfter == 0) {
@@ -225,14 +226,14 @@ INSTANTIATE_TEST_SUITE_P(
 
 TEST_F(HistoryTest, KeepsAnUpdateWholeThatBeganWhileTheDiskWasFull) {
     History history(settings());
-    history.refused(attempt(), 2, "before");
+    history.refused(attempt(), 2, core::ReasonId::FileNotRead, "before");
     rlimit limit{};
     ::getrlimit(RLIMIT_FSIZE, &limit);
     const rlimit full{0, limit.rlim_max};
     const auto handler = std::signal(SIGXFSZ, SIG_IGN);
     ::setrlimit(RLIMIT_FSIZE, &full);
     const auto record = history.begin(attempt());
-    history.refused(attempt(), 2, "lost");
+    history.refused(attempt(), 2, core::ReasonId::FileNotRead, "lost");
     core::UpdateAttempt required = attempt();
     required.mustBeKept = true;
     EXPECT_EQ(history.begin(required), nullptr);

@@ -11,6 +11,7 @@
 #include "CimXml/Request.h"
 #include "Cli/Display/Messages.h"
 #include "Control/Interface.h"
+#include "Framework/Requests/NotedCall.h"
 #include "Utils/Utils.h"
 
 namespace cli {
@@ -73,6 +74,9 @@ std::size_t takeHeader(char* data, std::size_t, std::size_t count, void* to) {
     std::string version;
     keep(control::kHeader, version);
     if (!version.empty()) reply.isControl = true;
+    std::string reason;
+    keep(control::kReasonHeader, reason);
+    core::NotedCall::noteReason(core::parseReasonCode(reason));
     return count;
 }
 

@@ -9,11 +9,11 @@ std::future<core::ImageFacts> RefusalSink::examine(std::span<const std::uint8_t>
     return m_next == nullptr ? std::future<core::ImageFacts>() : m_next->examine(file);
 }
 
-void RefusalSink::refused(const core::UpdateAttempt& attempt, unsigned int returnValue,
-                          const std::string& reason) noexcept {
-    if (m_next != nullptr) m_next->refused(attempt, returnValue, reason);
+void RefusalSink::refused(const core::UpdateAttempt& attempt, unsigned int returnValue, core::ReasonId reason,
+                          const std::string& text) noexcept {
+    if (m_next != nullptr) m_next->refused(attempt, returnValue, reason, text);
     try {
-        m_lastReason = reason;
+        m_lastReason = text;
     } catch (const std::bad_alloc&) {
         m_lastReason.clear();
     }

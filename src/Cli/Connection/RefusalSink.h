@@ -17,8 +17,8 @@ class RefusalSink : public core::UpdateSink {
     explicit RefusalSink(std::shared_ptr<core::UpdateSink> next) : m_next(std::move(next)) {}
 
     std::future<core::ImageFacts> examine(std::span<const std::uint8_t> file) noexcept override;
-    void refused(const core::UpdateAttempt& attempt, unsigned int returnValue,
-                 const std::string& reason) noexcept override;
+    void refused(const core::UpdateAttempt& attempt, unsigned int returnValue, core::ReasonId reason,
+                 const std::string& text) noexcept override;
     std::string problem() override;
     std::shared_ptr<core::UpdateRecord> begin(const core::UpdateAttempt& attempt) noexcept override;
 

@@ -56,6 +56,7 @@ void to_json(cli::Json& json, const Record& record) {
             {"returnValue", number(record.returnValue)},
             {"errorCode", number(record.errorCode)},
             {"reason", orNull(record.reason)},
+            {"reasonId", orNull(record.reasonId)},
             {"user", orNull(record.user)},
             {"address", orNull(record.address)},
             {"front", orNull(record.front)},

@@ -58,17 +58,23 @@ struct ServiceCall {
 
     /// In this process nobody else knows who asks, so the audit line is written here. A server writes its
     /// own.
-    void audit(const Connection& connection, const std::string& outcome) const {
+    void audit(const Connection& connection, const std::string& outcome, const core::NotedCall& noted) const {
         if (connection.isInProcess)
-            core::audit({core::CallerScope::current(), method, service.toString(), outcome}, arguments);
+            core::audit({core::CallerScope::current(), method, service.toString(), outcome, noted.notes()},
+                        arguments);
     }
 
     core::MethodResult run(const Connection& connection) const try {
-        const core::MethodResult result = connection.operations->invokeMethod(service, method, arguments);
-        audit(connection, core::outcomeOf(result));
-        return result;
-    } catch (const core::CimError& error) {
-        audit(connection, core::outcomeOf(error.status(), error.what()));
+        const core::NotedCall noted;
+        try {
+            const core::MethodResult result = connection.operations->invokeMethod(service, method, arguments);
+            audit(connection, core::outcomeOf(result), noted);
+            return result;
+        } catch (const core::CimError& error) {
+            audit(connection, core::outcomeOf(error.status(), error.what()), noted);
+            throw;
+        }
+    } catch (const core::CimError&) {
         throw;
     } catch (const CommandError&) {
         throw;
@@ -139,9 +145,10 @@ std::optional<std::uint32_t> verifyOnly(const Connection& connection, const Cand
     core::CimPath service = call.service;
     update::ImageCheck* check = update::findImageCheck(service);
     if (check == nullptr) return std::nullopt;
+    const core::NotedCall noted;
     const unsigned int returned =
         check->checkImage(candidate.uri, candidate.adapter.path, options.codes, options.values);
-    call.audit(connection, core::outcomeOf(core::MethodResult{returned, {}}));
+    call.audit(connection, core::outcomeOf(core::MethodResult{returned, {}}), noted);
     return returned;
 }
 

@@ -7,6 +7,7 @@
 #include "Cli/Update/Service.h"
 #include "Cli/Verbs/ManyResults.h"
 #include "Cli/Verbs/RunningUpdates.h"
+#include "Framework/Requests/NotedCall.h"
 
 namespace cli {
 
@@ -31,8 +32,10 @@ std::vector<Component> versionsAfter(const Candidate& candidate) {
 /// What would become of a candidate that is to be written.
 Outcome judge(const Connection& connection, const Candidate& candidate) {
     Outcome outcome(candidate);
+    const core::NotedCall noted;
     // A file that would be sent is not where the server could look at it.
     if (candidate.localFile.empty()) outcome.returnValue = verifyOnly(connection, candidate);
+    outcome.reason = noted.notes().reason;
     if (outcome.returnValue.value_or(MethodReturn::Completed) != MethodReturn::Completed) {
         outcome.end(Ending::Refused, explainRefusal(connection, *outcome.returnValue, candidate));
         return outcome;
@@ -129,7 +132,15 @@ class Run {
         m_results.notTried.push_back(candidate.adapter.name);
     }
 
-    Outcome one(const Candidate& candidate) try {
+    Outcome one(const Candidate& candidate) {
+        const core::NotedCall noted;
+        Outcome outcome = tried(candidate);
+        // What throws has no outcome to note it in.
+        if (outcome.ending == Ending::Refused) outcome.reason = noted.notes().reason;
+        return outcome;
+    }
+
+    Outcome tried(const Candidate& candidate) try {
         if (std::optional<Outcome> outcome = settle(m_context.connection, candidate, m_options.many.isFit)) {
             if (outcome->ending == Ending::Current) creditFollowed(*outcome);
             return *std::move(outcome);

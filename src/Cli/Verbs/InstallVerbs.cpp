@@ -9,6 +9,7 @@
 #include "Cli/Update/Service.h"
 #include "Cli/Verbs/ManyResults.h"
 #include "Cli/Verbs/Outcome.h"
+#include "Framework/Requests/NotedCall.h"
 
 namespace cli {
 
@@ -36,6 +37,7 @@ bool isInPlace(const Candidate& candidate, const std::vector<Component>& after) 
 void judgeCompleted(Outcome& outcome, const Candidate& candidate) {
     const std::string& name = outcome.adapter;
     if (!isInPlace(candidate, outcome.after)) {
+        outcome.reason = core::ReasonId::FlashWithoutEffect;
         outcome.end(Ending::Failed,
                     {"The update of " + name + " ended without an error, but " + name + " has " +
                          componentsText(outcome.after) + ", not what the image has.",
@@ -90,6 +92,7 @@ void followUpdate(Context& context, const core::CimPath& job, const Candidate& c
     if (outcome.job->hasSucceeded()) {
         judgeCompleted(outcome, candidate);
     } else {
+        outcome.reason = core::reasonOfErrorCode(outcome.job->errorCode);
         outcome.end(Ending::Failed,
                     explainFailedJob(context.connection, *outcome.job, candidate, outcome.after));
     }
@@ -156,7 +159,9 @@ Outcome installCandidate(Context& context, const Candidate& named) {
     }
     // The last moment to stop: once the service is called, nobody can.
     if (context.following.interrupted()) throw CommandError(ExitStatus::Interrupted, "Interrupted.", "");
+    const core::NotedCall noted;
     const std::optional<core::MethodResult> result = start(context, candidate, outcome);
+    outcome.reason = noted.notes().reason;
     if (result) conclude(context, *result, candidate, outcome);
     outcome.historyId = ownRecordOf(context.connection, candidate.adapter);
     return outcome;
@@ -206,12 +211,14 @@ ExitStatus check(Context& context, const VerbOptions& options) {
     const Connection& connection = context.connection;
     Candidate candidate = makeCandidate(connection, options.update);
     std::string advice;
+    const core::NotedCall noted;
     std::optional<std::uint32_t> returnValue = verifyOnly(connection, candidate);
     if (!returnValue) returnValue = checkByModel(context, options.update, candidate, advice);
     Outcome outcome(candidate);
     outcome.returnValue = returnValue;
     outcome.advice = advice;
     if (returnValue != MethodReturn::Completed) {
+        outcome.reason = noted.notes().reason;
         outcome.end(Ending::Refused, explainRefusal(connection, *returnValue, candidate));
     } else if (!candidate.force && candidate.isAlreadyCurrent()) {
         outcome.endAsCurrent(candidate);

@@ -72,6 +72,7 @@ void to_json(Json& json, const Outcome& outcome) {
             {"backend", outcome.backend},
             {"uri", outcome.uri},
             {"returnValue", nullptr},
+            {"reasonId", nullptr},
             {"job", nullptr},
             {"historyId", nullptr},
             {"unchecked", outcome.unchecked},
@@ -80,6 +81,7 @@ void to_json(Json& json, const Outcome& outcome) {
             {"before", outcome.before},
             {"after", outcome.after}};
     if (outcome.returnValue) json["returnValue"] = *outcome.returnValue;
+    if (outcome.reason != core::ReasonId::None) json["reasonId"] = core::reasonCode(outcome.reason);
     if (outcome.job) json["job"] = *outcome.job;
     if (outcome.historyId != 0) json["historyId"] = outcome.historyId;
     if (outcome.card) json["card"] = cardJson(*outcome.card);

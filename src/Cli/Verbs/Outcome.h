@@ -9,6 +9,7 @@
 #include "Cli/Update/Candidate.h"
 #include "Cli/Update/Jobs.h"
 #include "Cli/Verbs/Verbs.h"
+#include "Framework/Requests/Reasons.h"
 #include "MidAPI/Activation.h"
 
 namespace cli {
@@ -48,12 +49,13 @@ struct Outcome {
     std::string label;  ///< the adapter's, for results
     std::string backend;
     std::string uri;
-    std::optional<std::uint32_t> returnValue;  ///< of the method, when it was called
-    std::optional<JobView> job;                ///< when one was started
-    std::int64_t historyId = 0;                ///< its record in this machine's history; 0 for none
-    std::vector<std::string> unchecked;        ///< what only the write can show
-    std::string resetNeeded;                   ///< by what was written, as the model tells it
-    std::optional<ma::CardUse> card;           ///< looked at before an install in process
+    std::optional<std::uint32_t> returnValue;      ///< of the method, when it was called
+    core::ReasonId reason = core::ReasonId::None;  ///< why it was refused, or failed; none where nobody tells
+    std::optional<JobView> job;                    ///< when one was started
+    std::int64_t historyId = 0;                    ///< its record in this machine's history; 0 for none
+    std::vector<std::string> unchecked;            ///< what only the write can show
+    std::string resetNeeded;                       ///< by what was written, as the model tells it
+    std::optional<ma::CardUse> card;               ///< looked at before an install in process
     std::vector<Component> before;
     std::vector<Component> after;  ///< as before until something is written; empty if it cannot be read
 };

@@ -61,10 +61,15 @@ std::string shownText(const std::exception& error) {
 }
 
 std::string auditLine(const AuditEvent& event, const std::vector<Argument>& arguments) {
-    return "[audit]" + field("user", event.caller.principal, kNameLimit) +
-           field("address", event.caller.address, kNameLimit) +
-           field("operation", event.operation, kNameLimit) + field("target", event.target, kTextLimit) +
-           " arguments=\"" + argumentsText(arguments) + '"' + field("outcome", event.outcome, kTextLimit);
+    std::string line = "[audit]" + field("user", event.caller.principal, kNameLimit) +
+                       field("address", event.caller.address, kNameLimit) +
+                       field("operation", event.operation, kNameLimit) +
+                       field("target", event.target, kTextLimit) + " arguments=\"" +
+                       argumentsText(arguments) + '"' + field("outcome", event.outcome, kTextLimit);
+    if (!event.notes.sha256.empty()) line += field("sha256", event.notes.sha256, kNameLimit);
+    if (event.notes.reason != ReasonId::None)
+        line += field("reason", reasonCode(event.notes.reason), kNameLimit);
+    return line;
 }
 
 void audit(const AuditEvent& event, const std::vector<Argument>& arguments) noexcept {

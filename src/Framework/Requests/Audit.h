@@ -7,6 +7,7 @@
 
 #include "Framework/Requests/Caller.h"
 #include "Framework/Requests/CimOperations.h"
+#include "Framework/Requests/NotedCall.h"
 
 /// The audit trail: one line in the system log for each attempt to change something and for each refusal. A
 /// front writes it, since only a front knows who asks.
@@ -18,6 +19,7 @@ struct AuditEvent {
     std::string operation;  ///< "DeleteInstance", "InstallFromURI", "login"
     std::string target;     ///< the path of the object; may be empty
     std::string outcome;    ///< see outcomeOf(); "done", "denied: ...", "failed: ..."
+    CallNotes notes = {};
 };
 
 /// "returned 4096, Job=root/cimv2:...": the value, and the references among the outputs.
@@ -29,7 +31,7 @@ QUENX_EXPORT std::string outcomeOf(CimStatus status, const std::string& descript
 /// long.
 QUENX_EXPORT std::string shownText(const std::exception& error);
 
-/// The line, at most 1,300 characters of printable ASCII, whatever the event holds; docs/object-manager.md
+/// The line, at most 1,400 characters of printable ASCII, whatever the event holds; docs/object-manager.md
 /// has its exact form.
 /// @param arguments  of a method
 /// @throws std::bad_alloc

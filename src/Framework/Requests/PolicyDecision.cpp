@@ -5,6 +5,7 @@
 #include <string>
 
 #include "Framework/Model/CimError.h"
+#include "Framework/Requests/NotedCall.h"
 #include "Utils/Os/Linux/PolicyFile.h"
 #include "Utils/Toml.h"
 
@@ -14,7 +15,8 @@ namespace {
 
 thread_local const PolicyDecision* outermost = nullptr;
 
-[[noreturn]] void refuse(const std::string& text) {
+[[noreturn]] void refuse(ReasonId id, const std::string& text) {
+    NotedCall::noteReason(id);
     throw CimError(CimStatus::AccessDenied, text);
 }
 
@@ -24,23 +26,26 @@ std::shared_ptr<const utils::Policy> readPolicy() {
         try {
             return file->current();
         } catch (const utils::PolicyError& error) {
-            refuse(std::string(kBadPolicy) + " until the policy is mended: " + error.what());
+            refuse(ReasonId::PolicyUnreadable,
+                   std::string(kBadPolicy) + " until the policy is mended: " + error.what());
         }
     }
     if (utils::PolicyFile::isOnMachine())
-        refuse(std::string(kBadPolicy) + " here: there is a policy, " + utils::systemPolicyFile.load() +
-               ", and the program that loaded this provider cannot obey it; use quenxctl, quenx-cimd or "
-               "libQuenx_Cmpi.so");
+        refuse(ReasonId::PolicyUnreadable,
+               std::string(kBadPolicy) + " here: there is a policy, " + utils::systemPolicyFile.load() +
+                   ", and the program that loaded this provider cannot obey it; use quenxctl, quenx-cimd or "
+                   "libQuenx_Cmpi.so");
     return nullptr;
 }
 
 void requireAdministrator(const utils::Policy& policy, const Caller& caller) {
     if (!policy.administrators || caller.isFront) return;
     const std::string where = "\"administrators\" in " + policy.administratorsPlace;
-    if (caller.principal.empty()) refuse("a caller without a name may only read: " + where + ", is set");
+    if (caller.principal.empty())
+        refuse(ReasonId::NotAdministrator, "a caller without a name may only read: " + where + ", is set");
     if (std::ranges::find(*policy.administrators, caller.principal) == policy.administrators->end())
-        refuse("user " + utils::inQuotes(caller.principal) + " may only read: " + where +
-               ", has no such name");
+        refuse(ReasonId::NotAdministrator, "user " + utils::inQuotes(caller.principal) +
+                                               " may only read: " + where + ", has no such name");
 }
 
 }  // namespace

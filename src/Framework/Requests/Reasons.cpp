@@ -11,6 +11,8 @@ namespace {
 
 using Id = ReasonId;
 
+constexpr std::string_view kPrefix = "QX-";
+
 // The return values of the methods that install. Here as numbers, since the framework knows no provider.
 constexpr std::uint32_t kUnspecified = 2;
 constexpr std::uint32_t kFailed = 4;
@@ -98,8 +100,9 @@ constexpr Reason kReasons[] = {
 
     {Id::PolicyUnreadable, "The policy of the machine cannot be obeyed.",
      "Mend the line that the message names."},
-    {Id::NotAdministrator, "The policy lets this user only read.",
-     "Ask one of the administrators that the policy names."},
+    {Id::NotAdministrator, "The user may only read.",
+     "Use a name that may do this: an administrator of quenx-cimd, and where there is a policy one that it "
+     "has."},
     {Id::HistoryRequired, "The policy requires a history of updates, and none can be written.",
      "Make its folder writable again, or set \"history\" in the policy to \"wanted\".", kUnspecified},
 
@@ -148,10 +151,6 @@ constexpr Reason kReasons[] = {
 
 }  // namespace
 
-std::string Reason::code() const {
-    return utils::formatStr("QX-%04u", static_cast<unsigned>(id));
-}
-
 std::span<const Reason> allReasons() {
     return kReasons;
 }
@@ -162,12 +161,20 @@ const Reason* findReason(ReasonId id) {
 }
 
 std::string reasonCode(ReasonId id) {
-    const Reason* reason = findReason(id);
-    return reason == nullptr ? "" : reason->code();
+    if (id == ReasonId::None) return "";
+    return utils::formatStr("%.*s%04u", static_cast<int>(kPrefix.size()), kPrefix.data(),
+                            static_cast<unsigned>(id));
+}
+
+ReasonId parseReasonCode(std::string_view code) {
+    if (!code.starts_with(kPrefix)) return ReasonId::None;
+    const auto number = utils::parseNumber<std::uint16_t>(code.substr(kPrefix.size()));
+    return static_cast<ReasonId>(number.value_or(0));
 }
 
 ReasonId reasonOfErrorCode(std::uint32_t errorCode) {
-    const auto* found = std::ranges::find(kReasons, std::optional(errorCode), &Reason::errorCode);
+    const std::optional<std::uint32_t> served = errorCode & 0xFFFF;
+    const auto* found = std::ranges::find(kReasons, served, &Reason::errorCode);
     return found == std::end(kReasons) ? ReasonId::FlashFailed : found->id;
 }
 

@@ -5,6 +5,7 @@
 #include <optional>
 #include <span>
 #include <string>
+#include <string_view>
 
 #include "Utils/Export.h"
 
@@ -99,18 +100,18 @@ struct Reason {
     std::optional<std::uint32_t> returnValue = {};
     /// What the job ends with.
     std::optional<std::uint32_t> errorCode = {};
-
-    /// "QX-0123".
-    QUENX_EXPORT std::string code() const;
 };
 
 /// All rows, by rising numbers.
 QUENX_EXPORT std::span<const Reason> allReasons();
 /// The row of a cause; null for None.
 QUENX_EXPORT const Reason* findReason(ReasonId id);
-/// "QX-0123"; empty for None.
+/// "QX-0123", also of an id that another release has; empty for None.
 QUENX_EXPORT std::string reasonCode(ReasonId id);
-/// What a job's error code stands for: a failed write where no row has the code.
+/// The other way round; None for another text.
+QUENX_EXPORT ReasonId parseReasonCode(std::string_view code);
+/// What a job's error code stands for, of which clients see the lower 16 bits: a failed write where no row
+/// has it.
 QUENX_EXPORT ReasonId reasonOfErrorCode(std::uint32_t errorCode);
 
 }  // namespace core

@@ -9,6 +9,7 @@
 #include <vector>
 
 #include "Framework/Requests/Caller.h"
+#include "Framework/Requests/Reasons.h"
 #include "Utils/Export.h"
 #include "Utils/FirmwareTypes.h"
 
@@ -69,8 +70,9 @@ class QUENX_EXPORT UpdateSink {
     virtual std::future<ImageFacts> examine(std::span<const std::uint8_t> file) noexcept = 0;
     /// An attempt that came to nothing.
     /// @param returnValue  of the method; 0 for a call that ended in an error without one
-    virtual void refused(const UpdateAttempt& attempt, unsigned int returnValue,
-                         const std::string& reason) noexcept = 0;
+    /// @param text  the reason in words, which may say more than its row
+    virtual void refused(const UpdateAttempt& attempt, unsigned int returnValue, ReasonId reason,
+                         const std::string& text) noexcept = 0;
     /// Why no record could be kept now; empty where one can, which has been tried.
     virtual std::string problem() = 0;
     /// An update that begins as soon as this returns. Null where nothing can be kept of it, and for one that

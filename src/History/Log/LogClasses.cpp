@@ -29,6 +29,7 @@ constexpr core::CimElementText kAttemptTexts[] = {
     {"", "An attempt to install an image on an adapter."},
     {"Outcome", "How it ended: running, refused, failed, written or interrupted."},
     {"Reason", "Why nothing was written, in words."},
+    {"ReasonID", "The same as an id that stays from release to release: QX-0123."},
 };
 
 constexpr std::uint16_t kInformation = 2;

@@ -20,6 +20,7 @@ struct LogProperty {
 inline constexpr LogProperty<std::string> kLogTexts[] = {
     {"Outcome", &Record::outcome},
     {"Reason", &Record::reason},
+    {"ReasonID", &Record::reasonId},
     {"UserName", &Record::user, true},
     {"ClientAddress", &Record::address, true},
     {"Front", &Record::front},

@@ -99,8 +99,10 @@ std::optional<HttpAnswer> Control::checkHead(const HttpHead& head) {
 ControlCall::ControlCall(Control& control, const HttpHead& head, Caller caller)
     : m_control(control), m_caller(std::move(caller)), m_route(*findRoute(head.path)) {
     guarded([&] {
-        if (m_route.privilege == Privilege::Administer && !m_caller.isAdministrator)
+        if (m_route.privilege == Privilege::Administer && !m_caller.isAdministrator) {
+            core::NotedCall::noteReason(core::ReasonId::NotAdministrator);
             throw ControlRefusal(403, "user " + m_caller.user + " may only read");
+        }
         if (m_route.method == "PUT") beginUpload(head);
     });
 }
@@ -114,6 +116,7 @@ core::Caller ControlCall::asker() const {
 template <class Work>
 void ControlCall::guarded(Work work) {
     const core::CallerScope scope(asker());
+    const core::NotedCall noted;
     try {
         work();
     } catch (const std::exception& error) {
@@ -121,6 +124,7 @@ void ControlCall::guarded(Work work) {
         m_outcome = (m_refusal->status == 403 ? "denied: " : "failed: ") + core::shownText(error);
         m_upload.reset();
     }
+    m_notes = noted.notes();
 }
 
 void ControlCall::take(const char* data, std::size_t size) {
@@ -142,8 +146,9 @@ HttpAnswer ControlCall::finish() {
         });
     }
     if (m_refusal) answer = std::move(*m_refusal);
+    answer.tellReason(m_notes.reason);
     if (m_route.privilege == Privilege::Administer) {
-        const core::AuditEvent event{asker(), m_route.operation, m_target, m_outcome};
+        const core::AuditEvent event{asker(), m_route.operation, m_target, m_outcome, m_notes};
         if (answer.status == 403)
             m_control.m_trail->refused(event, {});
         else

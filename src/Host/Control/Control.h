@@ -9,6 +9,7 @@
 #include "Control/Interface.h"
 #include "Framework/Requests/Caller.h"
 #include "Framework/Requests/CimOperations.h"
+#include "Framework/Requests/NotedCall.h"
 #include "Host/Control/Spool.h"
 #include "Host/Operations/AuditTrail.h"
 #include "Host/Operations/Operations.h"
@@ -74,6 +75,7 @@ class ControlCall {
     const Route& m_route;
     std::string m_target;  ///< for the audit line
     std::string m_outcome = "done";
+    core::CallNotes m_notes;
     std::string m_body;
     std::unique_ptr<Upload> m_upload;
     std::optional<HttpAnswer> m_refusal;

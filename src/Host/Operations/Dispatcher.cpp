@@ -20,6 +20,7 @@ using core::CimStatus;
 
 void requirePrivilege(Privilege privilege, const Caller& caller) {
     if (privilege == Privilege::Administer && !caller.isAdministrator) {
+        core::NotedCall::noteReason(core::ReasonId::NotAdministrator);
         throw CimError(CimStatus::AccessDenied, "user " + caller.user + " may only read");
     }
 }
@@ -98,9 +99,10 @@ core::MethodResult Dispatcher::callMethod(const cimxml::MethodCall& call, const 
     return target.invokeMethod(call.object, call.method, call.arguments);
 }
 
-void Dispatcher::audit(const cimxml::Request& request, const Caller& caller,
-                       const cimxml::Response& response) try {
-    core::AuditEvent event{callerOf(caller), request.name(), "", std::visit(OutcomeText{}, response.content)};
+void Dispatcher::audit(const cimxml::Request& request, const Caller& caller, const cimxml::Response& response,
+                       const core::CallNotes& notes) try {
+    core::AuditEvent event{callerOf(caller), request.name(), "", std::visit(OutcomeText{}, response.content),
+                           notes};
     const auto* method = std::get_if<cimxml::MethodCall>(&request.call);
     event.target = method != nullptr ? method->object.toString()
                                      : targetOf(std::get<cimxml::IntrinsicCall>(request.call));
@@ -119,9 +121,10 @@ void Dispatcher::audit(const cimxml::Request& request, const Caller& caller,
 
 cimxml::Response Dispatcher::dispatch(const cimxml::Request& request, const Caller& caller,
                                       AnswerCharge& charge, core::InstanceSink* stream) {
+    const core::NotedCall noted;
     cimxml::Response response = carryOut(request, caller, charge, stream);
     // However it ended: that somebody was refused is worth knowing, too.
-    if (isAudited(request)) audit(request, caller, response);
+    if (isAudited(request)) audit(request, caller, response, noted.notes());
     return response;
 }
 

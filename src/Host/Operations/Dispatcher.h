@@ -46,7 +46,8 @@ class Dispatcher {
                                           AnswerCharge& charge, core::InstanceSink* stream);
     core::MethodResult callMethod(const cimxml::MethodCall& call, const Caller& caller);
     core::CimOperations& findNamespace(const std::string& name) const;
-    void audit(const cimxml::Request& request, const Caller& caller, const cimxml::Response& response);
+    void audit(const cimxml::Request& request, const Caller& caller, const cimxml::Response& response,
+               const core::CallNotes& notes);
 
     const Namespaces m_namespaces;
     AnswerBudget m_budget;

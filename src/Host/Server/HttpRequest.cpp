@@ -102,6 +102,11 @@ MHD_Response* makeResponse(HttpAnswer& answer) {
 
 }  // namespace
 
+void HttpAnswer::tellReason(core::ReasonId reason) {
+    if (reason != core::ReasonId::None)
+        headers.emplace_back(control::kReasonHeader, core::reasonCode(reason));
+}
+
 std::string addressOf(MHD_Connection* connection) {
     const MHD_ConnectionInfo* info =
         ::MHD_get_connection_info(connection, MHD_CONNECTION_INFO_CLIENT_ADDRESS);
@@ -247,10 +252,12 @@ HttpAnswer HttpRequest::dispatch(AnswerCharge charge) {
         cimxml::checkHeadersAgainst(m_head.cim, request);
         QUENX_DEBUG("%s of %s from %s", utils::escapeForFormat(request.name()).c_str(),
                     utils::escapeForFormat(m_user.name).c_str(), m_head.address.c_str());
+        const core::NotedCall noted;
         HttpAnswer answer{
             200,
             {{"Content-Type", "application/xml; charset=\"utf-8\""}, {"CIMOperation", "MethodResponse"}},
             m_server.m_dispatcher.answer(request, caller(), charge)};
+        answer.tellReason(noted.notes().reason);
         charge.set(answer.body.size());
         answer.charge.emplace(std::move(charge));
         return answer;

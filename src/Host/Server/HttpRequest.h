@@ -12,6 +12,7 @@
 
 #include "CimXml/Request.h"
 #include "CimXml/WireError.h"
+#include "Framework/Requests/Reasons.h"
 #include "Host/Authentication/PasswordChecker.h"
 #include "Host/Operations/AnswerBudget.h"
 #include "Host/Operations/Operations.h"
@@ -46,6 +47,9 @@ struct HttpAnswer {
         return {status, {{std::move(name), std::move(value)}}, ""};
     }
     static HttpAnswer refusal(const cimxml::WireError& error);
+
+    /// Says why the call was refused, in a header that our own client knows.
+    void tellReason(core::ReasonId reason);
 };
 
 /// The announced length of the body; nothing when no header says it in one number, or two differ.

@@ -1,12 +1,15 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Providers/SoftwareUpdate/AdapterClaim.h"
 
+#include "Framework/Requests/NotedCall.h"
 #include "Framework/Requests/PolicyDecision.h"
 #include "Providers/SoftwareUpdate/MethodResults.h"
 #include "Utils/Os/Linux/SMASHv2Config.h"
 #include "Utils/Utils.h"
 
 namespace {
+
+using Id = core::ReasonId;
 
 /// What is known of the newest claim. It may be over: that the adapter is serviced, only its name says.
 struct Note {
@@ -35,6 +38,7 @@ bool givesBackAfterCheck() {
 }  // namespace
 
 void AdapterClaim::take(std::string adapterName) {
+    bool isLeft = false;
     update::Claim claim{adapterName, core::CallerScope::current().principal, {}, {}, true};
     std::string holder;
     {
@@ -47,11 +51,14 @@ void AdapterClaim::take(std::string adapterName) {
             m_adapterName = std::move(adapterName);
             return;
         }
+        isLeft = newest.claim.adapter == holder && !newest.claim.isAtWork;
     }
     if (holder == adapterName) {
+        core::NotedCall::noteReason(isLeft ? Id::AdapterHeldByCheck : Id::AdapterUpdating);
         throw ETargetInUse(
             utils::formatStr("Firmware update for %s is currently in progress", adapterName.c_str()));
     }
+    core::NotedCall::noteReason(isLeft ? Id::OtherAdapterHeldByCheck : Id::OtherAdapterUpdating);
     throw EJobIsRunning(utils::formatStr("Other job for %s is running at this moment", holder.c_str()));
 }
 

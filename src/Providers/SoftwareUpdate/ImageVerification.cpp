@@ -2,8 +2,10 @@
 #include "Providers/SoftwareUpdate/ImageVerification.h"
 
 #include <algorithm>
+#include <cerrno>
 #include <new>
 #include <optional>
+#include <span>
 
 #include "MidAPI/ma.h"
 #include "Providers/SoftwareUpdate/MethodResults.h"
@@ -20,6 +22,7 @@
 
 namespace {
 
+using Id = core::ReasonId;
 using Buffer = std::unique_ptr<std::uint8_t[]>;
 
 // The functions that the log names, whichever helper here writes the line: those who search it know the
@@ -45,6 +48,7 @@ void appendTargetTypes(const std::string& value, std::vector<utils::FirmwareType
         utils::formatDebugLog(__FILE__, kGetTargetTypes, __LINE__, "TeargetType: %s", name.c_str());
         const auto type = findTargetType(name);
         if (!type) {
+            core::NotedCall::noteReason(Id::ImageTypeUnknown);
             throw utils::EInvalidParameter(utils::formatStr(
                 "Invalid parameter detected for TargetTypes. %s is not recognized", name.c_str()));
         }
@@ -99,9 +103,12 @@ class ImageFile {
             throw EInvalidUri(utils::formatStr("URI: %s is invalid", m_uri.c_str()));
         m_path = parsed.getSourcePath();
         m_limits = utils::AutoSingleton<utils::SMASHv2Config>::getInstance()->getImageLimits();
+        errno = 0;
         m_file = look();
-        if (!parsed.IsUriAccesible(m_file))
-            throw EUriDoesNotExist(utils::formatStr("URI: %s is invalid", m_uri.c_str()));
+        const bool isMissing = errno == ENOENT || errno == ENOTDIR;
+        if (parsed.IsUriAccesible(m_file)) return;
+        core::NotedCall::noteReason(isMissing ? Id::FileMissing : Id::FileNotOpened);
+        throw EUriDoesNotExist(utils::formatStr("URI: %s is invalid", m_uri.c_str()));
     }
 
     /// The adapter API counts in 32 bits.
@@ -110,7 +117,7 @@ class ImageFile {
         if (m_limits.largest != 0 && size > m_limits.largest) {
             QUENX_ERROR("%s has %u bytes, more than the %u that LargestImage allows", m_path.c_str(), size,
                         m_limits.largest);
-            refuse();
+            refuse(Id::FileTooLarge);
         }
         return size;
     }
@@ -118,12 +125,13 @@ class ImageFile {
     Buffer takeBytes() {
         if (m_file.isWithoutMemory) throw std::bad_alloc();
         // The file may have shrunk since it was measured.
-        if (m_file.count != static_cast<std::size_t>(m_file.size)) refuse();
+        if (m_file.count != static_cast<std::size_t>(m_file.size)) refuse(Id::FileNotRead);
         return std::move(m_file.bytes);
     }
 
   private:
-    [[noreturn]] void refuse() const {
+    [[noreturn]] void refuse(Id reason) const {
+        core::NotedCall::noteReason(reason);
         throw EImageReadError(utils::formatStr("Image read error: %s (%s)", m_uri.c_str(), m_path.c_str()));
     }
     os::FileLook look() const {
@@ -147,7 +155,7 @@ class ImageFile {
             QUENX_ERROR("%s is not read: its file system did not answer for %d seconds, now or earlier",
                         m_path.c_str(), static_cast<int>(m_limits.silence.count()));
         }
-        refuse();
+        refuse(patience.isUsedUp ? Id::FileSystemSlow : Id::FileSystemSilent);
     }
 
     const std::string& m_uri;
@@ -166,12 +174,14 @@ void judgeOtherTypes(bool force, const std::string& uri) {
     const bool enabled = utils::AutoSingleton<utils::SMASHv2Config>::getInstance()->isDowngradeEnabled();
     utils::formatDebugLog(__FILE__, kCheckAndVerifyImage, __LINE__, "DowngradeEnable: %d, ForceInstall: %d",
                           enabled, force);
+    if (enabled && force) return;
+    core::NotedCall::noteReason(enabled ? Id::OtherTypes : Id::OtherTypesForbidden);
     if (!enabled) {
         throw EDowngradeDetected(
             "The selected flash image cannot be used because it does not contain the same "
             "image types. Please select a flash file with matching image types.");
     }
-    if (!force) refuseWithoutForce(uri);
+    refuseWithoutForce(uri);
 }
 
 /// Throws the refusal that the adapter API's status stands for. Only 1 to 6 reject an image: a status that is
@@ -200,6 +210,16 @@ void judge(int status, bool force, const std::string& uri, const std::string& ad
     }
 }
 
+/// Has the adapter API prepare the image, and returns its status. Whatever it throws is its own failure.
+int prepare(const std::string& adapterName, std::span<const std::uint8_t> source, std::uint8_t* image,
+            std::uint32_t& imageSize, std::vector<utils::FirmwareType>& types) try {
+    return ma::prepareFlashImage(adapterName, source.data(), static_cast<std::uint32_t>(source.size()), image,
+                                 &imageSize, types);
+} catch (...) {
+    core::NotedCall::noteReason(Id::PreparationFailed);
+    throw;
+}
+
 /// Reads, prepares and judges the image.
 /// @param isAskingAdapter  set while the adapter API is at work
 PreparedImage readAndPrepare(const UpdateOrder& order, bool& isAskingAdapter) {
@@ -220,8 +240,7 @@ PreparedImage readAndPrepare(const UpdateOrder& order, bool& isAskingAdapter) {
 
     utils::formatDebugLog(__FILE__, kCheckAndVerifyImage, __LINE__, "Start preparing the image");
     isAskingAdapter = true;
-    const int status =
-        ma::prepareFlashImage(adapterName, source.get(), fileSize, image.get(), &imageSize, types);
+    const int status = prepare(adapterName, std::span(source.get(), fileSize), image.get(), imageSize, types);
     isAskingAdapter = false;
     examination.reset();
     utils::formatDebugLog(__FILE__, kCheckAndVerifyImage, __LINE__, "Image prepared %d", status);

@@ -7,12 +7,19 @@
 #include "Providers/SoftwareUpdate/UpdateReport.h"
 #include "Utils/Utils.h"
 
+void refuseArguments(const std::string& text) {
+    core::NotedCall::noteReason(core::ReasonId::ArgumentsWrong);
+    throw utils::EUnspecifiedError(text);
+}
+
 namespace {
+
+using Id = core::ReasonId;
 
 template <class Kind = core::CimProperty>
 Kind& require(const core::CimPropertyList& arguments, const char* name) {
     auto* argument = dynamic_cast<Kind*>(arguments.getPropertyByName(name));
-    if (argument == nullptr) throw utils::EUnspecifiedError(utils::formatStr("Expected %s argument", name));
+    if (argument == nullptr) refuseArguments(utils::formatStr("Expected %s argument", name));
     return *argument;
 }
 
@@ -67,20 +74,20 @@ const inventory::SoftwareIdentity* imageIdentity(const MethodKind& kind, const c
     const std::string path = source.toString();
     if (instance == nullptr) {
         QUENX_DEBUG("%s cannot find instance '%s'", kind.subject, path.c_str());
-        UpdateReport::noteReason("There is no image " + path);
+        UpdateReport::noteReason(Id::SourceUnknown, "There is no image " + path);
         return nullptr;
     }
     const auto* identity = dynamic_cast<const inventory::SoftwareIdentity*>(instance);
     // A class that derives from the identity, or only borrows its name, may mean something else by it.
     if (instance->getClassName() != "Quenx_SoftwareIdentity" || identity == nullptr) {
         QUENX_DEBUG("%s does not support source '%s'", kind.subject, path.c_str());
-        UpdateReport::noteReason("This is no software identity: " + path);
+        UpdateReport::noteReason(Id::SourceNoIdentity, "This is no software identity: " + path);
         return nullptr;
     }
     if (identity->getTypeCode() != inventory::SoftwareIdentity::FirmwareImage) {
         QUENX_DEBUG("%s does not support source '%s'. It is not a proper Firmware Image.", kind.subject,
                     path.c_str());
-        UpdateReport::noteReason("This identity is no image to install: " + path);
+        UpdateReport::noteReason(Id::SourceNoImage, "This identity is no image to install: " + path);
         return nullptr;
     }
     return identity;
@@ -95,7 +102,7 @@ std::optional<unsigned int> resolveSource(const MethodKind& kind, const core::Ci
     order.uri = findUri(identifier);
     if (order.uri.empty()) {
         QUENX_DEBUG("Could not obtain URI from the SoftwareIdentityResource (%s)", identifier.c_str());
-        UpdateReport::noteReason("There is no file of the identity " + identifier);
+        UpdateReport::noteReason(Id::SourceWithoutFile, "There is no file of the identity " + identifier);
         return MethodReturn::InvalidParameter;
     }
     QUENX_DEBUG("URI is: %s", order.uri.c_str());
@@ -103,7 +110,7 @@ std::optional<unsigned int> resolveSource(const MethodKind& kind, const core::Ci
         utils::joined(identity->getTargetTypes(), {&InstallOption::kTargetTypeSeparator, 1});
     if (targetTypes.empty()) {
         QUENX_DEBUG("Source '%s' does not contain any TargetTypes", source.toString().c_str());
-        UpdateReport::noteReason("The identity has no image types");
+        UpdateReport::noteReason(Id::SourceWithoutTypes, "The identity has no image types");
         return MethodReturn::InvalidParameter;
     }
     QUENX_DEBUG("TargetTypes are: %s", targetTypes.c_str());
@@ -118,7 +125,7 @@ std::optional<unsigned int> resolveTarget(const MethodKind& kind, const core::Ci
     const std::string path = target.toString();
     if (instance == nullptr) {
         QUENX_DEBUG("%s cannot find instance '%s'", kind.subject, path.c_str());
-        UpdateReport::noteReason("There is no target " + path);
+        UpdateReport::noteReason(Id::TargetUnknown, "There is no target " + path);
         return MethodReturn::InvalidParameter;
     }
     const std::string className = instance->getClassName();
@@ -129,12 +136,12 @@ std::optional<unsigned int> resolveTarget(const MethodKind& kind, const core::Ci
         if (port != nullptr) order.adapterName = port->getAdapterName();
     } else {
         QUENX_DEBUG("Firmware Update does not support target '%s'", path.c_str());
-        UpdateReport::noteReason("The target is neither a port nor a card: " + path);
+        UpdateReport::noteReason(Id::TargetOfOtherKind, "The target is neither a port nor a card: " + path);
         return MethodReturn::NotApplicable;
     }
     if (order.adapterName.empty()) {
         QUENX_DEBUG("Firmware Update does not support instance '%s'", path.c_str());
-        UpdateReport::noteReason("The target has no adapter: " + path);
+        UpdateReport::noteReason(Id::TargetWithoutAdapter, "The target has no adapter: " + path);
         return MethodReturn::InvalidParameter;
     }
     return std::nullopt;
@@ -150,8 +157,7 @@ void MethodArguments::requirePresent(std::initializer_list<const char*> names) c
 void MethodArguments::requireNotNull(std::initializer_list<const char*> names) const {
     for (const char* name : names) {
         if (!isNull(name)) continue;
-        throw utils::EUnspecifiedError(
-            utils::formatStr("%s argument is set to NULL. It is not allowed", name));
+        refuseArguments(utils::formatStr("%s argument is set to NULL. It is not allowed", name));
     }
 }
 
@@ -188,7 +194,7 @@ std::optional<unsigned int> resolve(const MethodKind& kind, const core::CimPath*
     } catch (...) {
         // The failures of other providers never leave a method.
         QUENX_DEBUG("Unspecified Error for '%s'", target.toString().c_str());
-        UpdateReport::noteReason("Source or target could not be looked up");
+        UpdateReport::noteReason(Id::LookUpFailed, "Source or target could not be looked up");
         return MethodReturn::UnspecifiedError;
     }
 }

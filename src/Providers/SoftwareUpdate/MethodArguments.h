@@ -12,6 +12,9 @@
 #include "Providers/SoftwareUpdate/ImageVerification.h"
 #include "Providers/SoftwareUpdate/MethodResults.h"
 
+/// Throws utils::EUnspecifiedError: the call is not as the method declares it.
+[[noreturn]] void refuseArguments(const std::string& text);
+
 /// The arguments of a method call. Every operation throws utils::EUnspecifiedError for an argument that was
 /// not passed, or is of another type than declared: "Expected %s argument".
 class MethodArguments {

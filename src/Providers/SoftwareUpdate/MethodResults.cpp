@@ -1,8 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Providers/SoftwareUpdate/MethodResults.h"
 
-#include <optional>
-
 #include "Providers/SoftwareUpdate/UpdateReport.h"
 #include "Utils/Log.h"
 
@@ -13,29 +11,33 @@ bool is(const utils::Exception& exception) {
     return dynamic_cast<const T*>(&exception) != nullptr;
 }
 
+using Id = core::ReasonId;
+
 struct RefusalCode {
     bool (*isOf)(const utils::Exception&);
     int code;
+    /// What the type alone says, where whoever threw it has not noted a closer one.
+    Id reason;
 };
 
 constexpr RefusalCode kRefusalCodes[] = {
-    {is<EJobIsRunning>, VerifyJobResult::JobIsRunning},
-    {is<ETargetInUse>, VerifyJobResult::TargetInUse},
-    {is<EInvalidUri>, VerifyJobResult::InvalidUri},
-    {is<EUriDoesNotExist>, VerifyJobResult::UriDoesNotExist},
-    {is<EImageReadError>, VerifyJobResult::ImageReadError},
-    {is<EAdapterNotSupported>, VerifyJobResult::AdapterNotSupported},
-    {is<utils::EInvalidParameter>, VerifyJobResult::InvalidParameter},
-    {is<utils::EUnspecifiedError>, VerifyJobResult::UnspecifiedError},
-    {is<EDowngradeDetected>, VerifyJobResult::DowngradeDetected},
-    {is<ENotApplicableForTarget>, VerifyJobResult::NotApplicableForTarget},
+    {is<EJobIsRunning>, VerifyJobResult::JobIsRunning, Id::OtherAdapterUpdating},
+    {is<ETargetInUse>, VerifyJobResult::TargetInUse, Id::AdapterUpdating},
+    {is<EInvalidUri>, VerifyJobResult::InvalidUri, Id::UriInvalid},
+    {is<EUriDoesNotExist>, VerifyJobResult::UriDoesNotExist, Id::FileMissing},
+    {is<EImageReadError>, VerifyJobResult::ImageReadError, Id::FileNotRead},
+    {is<EAdapterNotSupported>, VerifyJobResult::AdapterNotSupported, Id::ImageNotSupported},
+    {is<utils::EInvalidParameter>, VerifyJobResult::InvalidParameter, Id::ImageDamaged},
+    {is<utils::EUnspecifiedError>, VerifyJobResult::UnspecifiedError, Id::AdapterNotRead},
+    {is<EDowngradeDetected>, VerifyJobResult::DowngradeDetected, Id::ImageOlder},
+    {is<ENotApplicableForTarget>, VerifyJobResult::NotApplicableForTarget, Id::ImageNotApplicable},
 };
 
-/// Nothing for an exception that is not a refusal.
-std::optional<int> codeOf(const utils::Exception& exception) {
+/// Null for an exception that is not a refusal.
+const RefusalCode* refusalOf(const utils::Exception& exception) {
     for (const RefusalCode& refusal : kRefusalCodes)
-        if (refusal.isOf(exception)) return refusal.code;
-    return std::nullopt;
+        if (refusal.isOf(exception)) return &refusal;
+    return nullptr;
 }
 
 /// A line of the log is `before`, the target's path, `after`.
@@ -67,16 +69,17 @@ constexpr Verdict kVerdicts[] = {
 }  // namespace
 
 bool isRefusal(const utils::Exception& exception) {
-    return codeOf(exception).has_value();
+    return refusalOf(exception) != nullptr;
 }
 
 int verifyJobResultOf(const utils::Exception& exception) noexcept {
     UpdateReport::noteReason(exception.what());
-    const std::optional<int> code = codeOf(exception);
+    const RefusalCode* refusal = refusalOf(exception);
     // What is not a refusal has logged itself, if it could.
-    if (!code) return VerifyJobResult::UnspecifiedError;
+    if (refusal == nullptr) return VerifyJobResult::UnspecifiedError;
+    core::NotedCall::noteReason(refusal->reason);
     QUENX_ERROR("Exception: '%s'", exception.what());
-    return *code;
+    return refusal->code;
 }
 
 unsigned int returnValueOf(const MethodKind& kind, int verifyJobResult, const std::string& target) {

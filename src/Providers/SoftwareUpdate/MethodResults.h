@@ -1,8 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include <new>
 #include <string>
 
+#include "Framework/Requests/NotedCall.h"
 #include "Providers/Schema/ValueMaps.h"
 #include "Utils/Exception.h"
 
@@ -99,6 +101,9 @@ int resultOf(Step&& step) noexcept {
         return step();
     } catch (const utils::Exception& exception) {
         return verifyJobResultOf(exception);
+    } catch (const std::bad_alloc&) {
+        core::NotedCall::noteReason(core::ReasonId::NoMemoryToPrepare);
+        return VerifyJobResult::UnspecifiedError;
     } catch (...) {
         return VerifyJobResult::UnspecifiedError;
     }

@@ -85,6 +85,7 @@ int Quenx_ConcreteJobClass::createJob(UpdateOrder& order, Quenx_ConcreteJob*& jo
         AdapterClaim::releaseIfConfigured(Quenx_ConcreteJob::m_servicedAdapter, order.adapterName);
         throw;
     }
+    core::NotedCall::noteReason(core::ReasonId::WorkerNotStarted);
     // Its destruction waits for a thread that never ran, so it is left to the list's release.
     m_instances.remove(created);
     return VerifyJobResult::JobStartFailed;

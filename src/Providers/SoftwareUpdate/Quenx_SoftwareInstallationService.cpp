@@ -14,6 +14,7 @@
 namespace {
 
 using core::CimPropertyList;
+using Id = core::ReasonId;
 
 constexpr std::uint16_t kOperationalStatusOk = 2;
 
@@ -24,9 +25,6 @@ constexpr std::uint16_t kRefusedOptions[] = {
     InstallOption::Reboot,     InstallOption::Password,   InstallOption::Uninstall,
     InstallOption::Log,        InstallOption::SilentMode, InstallOption::AdministrativeMode,
 };
-
-constexpr const char* kRefusedOptionsText =
-    "InstallOptions lacks 5 (Update), or has one that is not supported";
 
 bool areOptionsAccepted(const std::vector<std::uint16_t>& options) {
     const auto isGiven = [&options](std::uint16_t option) {
@@ -56,10 +54,11 @@ std::optional<unsigned int> checkTargetAndCollection(const MethodArguments& in, 
     const bool noSource = in.isNull("Source");
     const bool noTarget = in.isNull("Target");
     QUENX_DEBUG("Target:%d, Source:%d, Collection:%d", noTarget, noSource, noCollection);
-    if (!noTarget && !noCollection) throw utils::EUnspecifiedError(bothGiven);
-    if (noTarget && noCollection) throw utils::EUnspecifiedError("Neither Target nor Collection are defined");
-    if (noTarget) return MethodReturn::CollectionNotSupported;
-    return std::nullopt;
+    if (!noTarget && !noCollection) refuseArguments(bothGiven);
+    if (noTarget && noCollection) refuseArguments("Neither Target nor Collection are defined");
+    if (!noTarget) return std::nullopt;
+    core::NotedCall::noteReason(Id::CollectionsNotSupported);
+    return MethodReturn::CollectionNotSupported;
 }
 
 /// Completes the order and has the registry carry it out; onSuccess receives the job. Whatever the registry
@@ -83,6 +82,7 @@ unsigned int carryOut(const MethodKind& kind, const core::CimPath* source, const
         if (returnValue == MethodReturn::JobStarted || returnValue == MethodReturn::Completed) onSuccess(job);
         return returnValue;
     } catch (...) {
+        core::NotedCall::noteReason(Id::NoMemory);
         QUENX_DEBUG("Allocation error occured for '%s'", targetText.c_str());
         return MethodReturn::InsufficientMemory;
     }
@@ -127,7 +127,7 @@ unsigned int Quenx_SoftwareInstallationService::InstallFromURI(CimPropertyList& 
                       arguments.texts("InstallOptionsValues")};
     UpdateReport::noteOrder(order, target);
     if (!areOptionsAccepted(order.options)) {
-        UpdateReport::noteReason(kRefusedOptionsText);
+        core::NotedCall::noteReason(Id::OptionsNotSupported);
         return MethodReturn::InvalidParameter;
     }
     return carryOut(kInstalling, nullptr, target, std::move(order),
@@ -152,7 +152,7 @@ unsigned int Quenx_SoftwareInstallationService::InstallFromSoftwareIdentity(CimP
     QUENX_DEBUG("Starting arguments verification success");
     if (!areOptionsAccepted(order.options) || IsValueDefined(InstallOption::TargetTypes, order.options)) {
         QUENX_DEBUG("One of value of InstallOptions value is not supported");
-        UpdateReport::noteReason(kRefusedOptionsText);
+        core::NotedCall::noteReason(Id::OptionsNotSupported);
         return MethodReturn::InvalidParameter;
     }
     return carryOut(kInstalling, &source, target, std::move(order),
@@ -182,6 +182,7 @@ unsigned int Quenx_SoftwareInstallationService::CheckSoftwareIdentity(CimPropert
         QUENX_DEBUG(
             "InstallCharacterisitcs argument is an output method's argument. Any input value is not "
             "supported.");
+        core::NotedCall::noteReason(Id::ArgumentsWrong);
         return MethodReturn::InvalidParameter;
     }
     return carryOut(kChecking, &source, target, {},
@@ -194,7 +195,10 @@ unsigned int Quenx_SoftwareInstallationService::checkImage(const std::string& ur
                                                            const std::vector<std::string>& values) {
     const utils::TimeStamp timing("Quenx_SoftwareInstallationService::checkImage");
     const core::RequestScope scope;  // for callers that come without the request layer
-    if (!areOptionsAccepted(options)) return MethodReturn::InvalidParameter;
+    if (!areOptionsAccepted(options)) {
+        core::NotedCall::noteReason(Id::OptionsNotSupported);
+        return MethodReturn::InvalidParameter;
+    }
     UpdateOrder order{{}, uri, options, values};
     if (const auto refused = resolve(kChecking, nullptr, target, order)) return *refused;
     return returnValueOf(kChecking, resultOfExamining(order), target.toString());

@@ -25,18 +25,13 @@ std::string withoutNames(std::string_view text) {
     return std::string(text);
 }
 
-/// For what nobody on the way has given a reason.
-std::string_view reasonOf(unsigned int returnValue) {
-    switch (returnValue) {
-        case MethodReturn::Failed:
-            return "The thread that writes the flash could not be started";
-        case MethodReturn::InsufficientMemory:
-            return "There was not enough memory";
-        case MethodReturn::CollectionNotSupported:
-            return "Collections are not supported";
-        default:
-            return "The system log of that time may have the reason";
-    }
+/// For what nobody on the way has given words.
+std::string_view textOf(core::ReasonId id) {
+    const core::Reason* reason = core::findReason(id);
+    if (reason == nullptr) return "The system log of that time may have the reason";
+    std::string_view text = reason->text;
+    text.remove_suffix(1);  // others put it into sentences of their own
+    return text;
 }
 
 core::UpdateSink* wantedSink() {
@@ -48,7 +43,7 @@ core::UpdateSink* wantedSink() {
 void refuseWithout(const std::string& problem) {
     const std::string text = "The policy requires a history of updates, and none can be written: " + problem;
     QUENX_ERROR_TEXT(text);
-    UpdateReport::noteReason(text);
+    UpdateReport::noteReason(core::ReasonId::HistoryRequired, text);
 }
 
 }  // namespace
@@ -69,7 +64,7 @@ UpdateReport::~UpdateReport() {
 
 void UpdateReport::answered(unsigned int returnValue) noexcept {
     if (m_sink == nullptr || returnValue == MethodReturn::JobStarted) return;
-    noteReason(reasonOf(returnValue));
+    noteReason(textOf(m_noted.notes().reason));
     tell(returnValue);
 }
 
@@ -81,7 +76,7 @@ void UpdateReport::failed(const char* error) noexcept {
 
 void UpdateReport::tell(unsigned int returnValue) noexcept {
     // What has begun has a record of its own, which says that it came to nothing.
-    if (!m_hasBegun) m_sink->refused(m_attempt, returnValue, m_reason);
+    if (!m_hasBegun) m_sink->refused(m_attempt, returnValue, m_noted.notes().reason, m_reason);
 }
 
 void UpdateReport::noteOrder(const UpdateOrder& order, const core::CimPath& target) noexcept try {
@@ -101,13 +96,16 @@ void UpdateReport::noteReason(std::string_view text) noexcept try {
 }
 
 UpdateReport::Examination::Examination(std::span<const std::uint8_t> file) {
-    if (current != nullptr) m_facts = current->m_sink->examine(file);
+    core::UpdateSink* const sink = core::UpdateSink::installed();
+    if (sink != nullptr && core::NotedCall::isCollecting()) m_facts = sink->examine(file);
 }
 
 UpdateReport::Examination::~Examination() {
     if (!m_facts.valid()) return;
     try {
-        current->m_attempt.image = m_facts.get();
+        core::ImageFacts facts = m_facts.get();
+        core::NotedCall::noteImage(facts.sha256);
+        if (current != nullptr) current->m_attempt.image = std::move(facts);
     } catch (...) {
         // Without memory the image stays without a sum.
     }

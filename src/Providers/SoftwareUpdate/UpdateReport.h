@@ -10,6 +10,7 @@
 #include <vector>
 
 #include "Framework/Model/CimValue.h"
+#include "Framework/Requests/NotedCall.h"
 #include "Framework/Requests/UpdateSink.h"
 #include "Providers/SoftwareUpdate/ImageVerification.h"
 
@@ -28,12 +29,17 @@ class UpdateReport {
     void answered(unsigned int returnValue) noexcept;
     void failed(const char* error) noexcept;
 
-    // What others on the way learn. Outside a call that installs, these do nothing. What there is no memory
-    // for is left out.
+    // What others on the way learn. Outside a call that installs, these do no more than to note it for the
+    // front. What there is no memory for is left out.
 
     static void noteOrder(const UpdateOrder& order, const core::CimPath& target) noexcept;
-    /// Why the call is refused, in words; the first reason counts.
+    /// Why the call is refused, in words that name what is wrong; the first counts. With its row in the
+    /// table, where that is not known yet: what throws an exception leaves the words to that.
     static void noteReason(std::string_view text) noexcept;
+    static void noteReason(core::ReasonId id, std::string_view text) noexcept {
+        core::NotedCall::noteReason(id);
+        noteReason(text);
+    }
     /// Looks at the bytes of an image while a scope prepares it.
     class Examination {
       public:
@@ -58,6 +64,7 @@ class UpdateReport {
 
     core::UpdateSink* const m_sink;
     core::UpdateAttempt m_attempt;
+    const core::NotedCall m_noted;
     std::string m_reason;
     bool m_hasBegun = false;
 };

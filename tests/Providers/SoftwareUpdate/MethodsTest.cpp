@@ -92,13 +92,15 @@ class MethodsTest : public test::UpdateTest {
     /// A call, its outcome and its lines as in the sample.
     void expect(const Texts& row) const {
         SCOPED_TRACE(row[0]);
-        const std::string& value = row.at(1);
+        const std::size_t blank = std::min(row.at(1).find(' '), row[1].size());
+        const std::string value = row[1].substr(0, blank);
         const bool throws = value == "throws";
         const bool starts = value == "4096";
         const std::string claimed = row[0].find(" beside eth0;") != std::string::npos ? "eth0" : "";
         test::SyslogCapture::clear();
         setClaim(claimed);
         const CallResult result = make(row[0]);
+        EXPECT_EQ(core::reasonCode(result.reason), utils::trim(row[1].substr(blank)));
         EXPECT_EQ(result.error, throws ? "SMASHv2:" + row.at(2) : "");
         EXPECT_TRUE(throws || std::to_string(result.returnValue) == value) << result.returnValue;
         for (std::size_t i = 2; i < row.size(); ++i)
@@ -300,9 +302,10 @@ TEST_F(MethodsTest, AsksThePolicyBeforeAnythingIsClaimed) {
 class FailingSink : public core::UpdateSink {
   public:
     std::future<core::ImageFacts> examine(std::span<const std::uint8_t>) noexcept override { return {}; }
-    void refused(const core::UpdateAttempt& attempt, unsigned int returnValue,
-                 const std::string& reason) noexcept override {
-        said += attempt.caller.principal + " " + std::to_string(returnValue) + ": " + reason + "\n";
+    void refused(const core::UpdateAttempt& attempt, unsigned int returnValue, core::ReasonId reason,
+                 const std::string& text) noexcept override {
+        said += attempt.caller.principal + " " + std::to_string(returnValue) + " " +
+                core::reasonCode(reason) + ": " + text + "\n";
     }
     std::string problem() override { return m_problem; }
     std::shared_ptr<core::UpdateRecord> begin(const core::UpdateAttempt&) noexcept override { return {}; }
@@ -327,7 +330,7 @@ TEST_F(MethodsTest, InstallsNothingWithoutTheHistoryThatThePolicyRequires) {
     expectRefused();
     sink->m_problem.clear();
     expectRefused();
-    EXPECT_EQ(sink->said, "alice 2: " + text + "the disk is full\nalice 2: " + text +
+    EXPECT_EQ(sink->said, "alice 2 QX-0503: " + text + "the disk is full\nalice 2 QX-0503: " + text +
                               "its record was not written in time\n");
     m_folder.write("policy.toml", "history = \"off\"\n");
     EXPECT_EQ(install("file:///none", "eth0").returnValue, MethodReturn::InvalidParameter);

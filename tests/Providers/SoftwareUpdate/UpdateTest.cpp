@@ -62,6 +62,7 @@ std::vector<Argument> UpdateTest::argumentsOf(const std::string& text) {
 
 CallResult UpdateTest::call(const std::string& method, const std::string& arguments) const {
     CallResult result;
+    const core::NotedCall noted;
     try {
         const core::MethodResult answer = m_requests.invokeMethod(service(), method, argumentsOf(arguments));
         result.returnValue = answer.returnValue;
@@ -73,6 +74,7 @@ CallResult UpdateTest::call(const std::string& method, const std::string& argume
     } catch (const core::CimError& error) {
         result.error = error.what();
     }
+    result.reason = noted.notes().reason;
     return result;
 }
 

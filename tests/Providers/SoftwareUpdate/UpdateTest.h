@@ -9,6 +9,7 @@
 #include <vector>
 
 #include "Framework/Requests/CimRequests.h"
+#include "Framework/Requests/NotedCall.h"
 #include "Providers/SoftwareUpdate/HookedBackend.h"
 #include "Providers/SoftwareUpdate/Quenx_ConcreteJob.h"
 #include "Providers/SoftwareUpdate/SoftwareUpdateAgent.h"
@@ -26,6 +27,7 @@ struct CallResult {
     std::string error;  ///< the text of the CIM error; the return value means nothing then
     std::optional<core::CimPath> job;
     std::string characteristics;
+    core::ReasonId reason = core::ReasonId::None;  ///< as it was noted on the way
 };
 
 /// The provider as a host has it, on simulated adapters: a configuration, the adapter locker, the inventory
