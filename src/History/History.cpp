@@ -60,6 +60,7 @@ Record recordOf(const core::UpdateAttempt& attempt) {
     record.adapter = attempt.adapter;
     record.uri = cut(attempt.uri);
     record.sha256 = attempt.image.sha256;
+    record.signedBy = attempt.signedBy;
     if (!attempt.image.sha256.empty()) record.bytes = static_cast<std::int64_t>(attempt.image.bytes);
     record.imageVersions = attempt.image.versions;
     record.types = joinedNames(attempt.types);

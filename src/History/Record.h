@@ -44,6 +44,7 @@ struct Record {
     std::string serial;
     std::string uri;
     std::string sha256;
+    std::string signedBy;  ///< the key by which the image was trusted
     Number bytes;
     std::string imageVersions;  ///< "IMG_PXE 2, IMG_UEFI 2"
     std::string types;          ///< that were written: "IMG_PXE+IMG_UEFI"

@@ -61,11 +61,9 @@ constexpr Column kColumns[] = {
     {"versions_after", &Record::versionsAfter},
     {"job", &Record::job},
     {"reason_id", &Record::reasonId},
+    {"signed_by", &Record::signedBy},
 };
 constexpr int kColumnCount = static_cast<int>(std::size(kColumns));
-
-/// What nothing fills yet: the key that an image was signed with.
-constexpr const char* kUnfilledColumn = ", signed_by TEXT";
 
 /// Each query below has one that holds just the rows that it wants.
 constexpr const char* kIndexes =
@@ -89,7 +87,7 @@ std::string tableSql() {
         const bool isText = std::holds_alternative<std::string Record::*>(column.field);
         sql += std::string(", ") + column.name + (isText ? " TEXT" : " INTEGER");
     }
-    return sql + kUnfilledColumn + ");" + kIndexes;
+    return sql + ");" + kIndexes;
 }
 
 /// Binds the columns, in their order, as the parameters from 1 on.

@@ -56,16 +56,52 @@ void readReleaseClaim(const TomlTable& table, std::string_view key, const std::s
     if (table.has(key)) policy.releaseClaimAfterCheck = table.flag(key, false);
 }
 
-void readKeepImages(const TomlTable& table, std::string_view key, const std::string&, Policy& policy) {
-    const std::optional<std::string> folder = table.text(key);
-    if (folder && !folder->starts_with('/')) table.refuse(key, *folder, "the whole path of a folder");
-    policy.keepImages = folder.value_or("");
+bool isWholePath(std::string_view path) {
+    return path.starts_with('/');
 }
 
-constexpr Key kKeys[] = {
-    {"administrators", readAdministrators},          {"history", readHistory},
-    {"history_records", readHistoryRecords},         {"history_served", readHistoryServed},
-    {"release_claim_after_check", readReleaseClaim}, {"keep_images", readKeepImages}};
+/// Nothing where the file has no such key.
+std::optional<std::string> folderIn(const TomlTable& table, std::string_view key) {
+    std::optional<std::string> folder = table.text(key);
+    if (folder && !isWholePath(*folder)) table.refuse(key, *folder, "the whole path of a folder");
+    return folder;
+}
+
+void readKeepImages(const TomlTable& table, std::string_view key, const std::string&, Policy& policy) {
+    policy.keepImages = folderIn(table, key).value_or("");
+}
+
+void readImageDirectories(const TomlTable& table, std::string_view key, const std::string&, Policy& policy) {
+    policy.imageDirectories = table.texts(key, isWholePath, "whole paths, such as [\"/srv/firmware\"]");
+}
+
+void readLargestImage(const TomlTable& table, std::string_view key, const std::string&, Policy& policy) {
+    constexpr std::int64_t kMost = INT32_MAX;  // no image is larger for the adapter API
+    const auto bytes = table.number<std::int64_t>(key, kMost);
+    if (bytes && *bytes < 1) table.refuse(key, std::to_string(*bytes), "a number of bytes");
+    policy.largestImage = bytes.value_or(policy.largestImage);
+}
+
+void readTrust(const TomlTable& table, std::string_view key, const std::string&, Policy& policy) {
+    // In the order of the rules.
+    constexpr std::string_view kNames[] = {"off", "signature"};
+    if (const auto index = table.choice(key, kNames)) policy.trust = static_cast<TrustRule>(*index);
+}
+
+void readTrustKeys(const TomlTable& table, std::string_view key, const std::string&, Policy& policy) {
+    policy.trustKeys = folderIn(table, key).value_or(policy.trustKeys);
+}
+
+constexpr Key kKeys[] = {{"administrators", readAdministrators},
+                         {"history", readHistory},
+                         {"history_records", readHistoryRecords},
+                         {"history_served", readHistoryServed},
+                         {"release_claim_after_check", readReleaseClaim},
+                         {"keep_images", readKeepImages},
+                         {"image_directories", readImageDirectories},
+                         {"largest_image", readLargestImage},
+                         {"trust", readTrust},
+                         {"trust_keys", readTrustKeys}};
 
 }  // namespace
 

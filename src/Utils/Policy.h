@@ -28,6 +28,12 @@ enum class HistoryRule {
     Required  ///< where it cannot, none does
 };
 
+/// What an image needs beside its bytes to be written.
+enum class TrustRule {
+    Off,
+    Signature  ///< one by a key of the policy's folder, for it or for a manifest that names it
+};
+
 /// What the administrators of a machine want kept to, as one reading of their file has it. Whatever is absent
 /// restricts nothing.
 struct Policy {
@@ -40,6 +46,11 @@ struct Policy {
     /// Whether a check gives back the adapter that it claimed; absent: as ReleaseClaimAfterCheck has it.
     std::optional<bool> releaseClaimAfterCheck;
     std::string keepImages;  ///< a folder for images that were written; empty for none
+    /// The folders below which images may lie, links resolved; absent: anywhere.
+    std::optional<std::vector<std::string>> imageDirectories;
+    std::int64_t largestImage = 0;  ///< bytes; 0 for any
+    TrustRule trust = TrustRule::Off;
+    std::string trustKeys = "/etc/quenx/keys";  ///< the folder with the certificates that are trusted
 };
 
 /// Reads the text of a policy, whole: a key that nothing here obeys would promise what nobody keeps.

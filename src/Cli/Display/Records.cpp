@@ -70,6 +70,7 @@ void to_json(cli::Json& json, const Record& record) {
             {"serialNumber", orNull(record.serial)},
             {"uri", orNull(record.uri)},
             {"sha256", orNull(record.sha256)},
+            {"signedBy", orNull(record.signedBy)},
             {"bytes", number(record.bytes)},
             {"imageVersions", orNull(record.imageVersions)},
             {"types", orNull(record.types)},

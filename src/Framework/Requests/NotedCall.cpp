@@ -34,4 +34,10 @@ void NotedCall::noteImage(const std::string& sha256) noexcept try {
 } catch (const std::bad_alloc&) {
 }
 
+void NotedCall::noteKey(const std::string& key) noexcept try {
+    for (NotedCall* each = innermost; each != nullptr; each = each->m_outer)
+        each->m_notes.signedBy = key;
+} catch (const std::bad_alloc&) {
+}
+
 }  // namespace core

@@ -11,6 +11,7 @@ namespace core {
 struct CallNotes {
     ReasonId reason = ReasonId::None;  ///< why it was refused; the first reason counts
     std::string sha256 = {};           ///< of the image that was read
+    std::string signedBy = {};         ///< the key by which it is trusted
 };
 
 /// Collects the notes of the calls that the calling thread carries out for the length of a scope, for whoever
@@ -29,6 +30,8 @@ class QUENX_EXPORT NotedCall {
     static void noteReason(ReasonId id) noexcept;
     /// Left out where there is no memory for it.
     static void noteImage(const std::string& sha256) noexcept;
+    /// Likewise.
+    static void noteKey(const std::string& key) noexcept;
 
   private:
     CallNotes m_notes;

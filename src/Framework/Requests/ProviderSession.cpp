@@ -75,16 +75,19 @@ void ProviderLibraries::load(const std::string& directory) {
     }
 }
 
+LibraryEntry::LibraryEntry(const std::string& library, const char* name) {
+    const std::string path = ProviderLibraries::defaultDirectory() + "/" + library;
+    void* const handle = dlopen(path.c_str(), RTLD_NOW | RTLD_LOCAL | RTLD_NODELETE);
+    if (handle != nullptr) m_address = dlsym(handle, name);
+    if (m_address == nullptr) m_problem = path + ": " + loaderReason(path);
+}
+
 std::string ProviderSession::loadHistory() {
-    const std::string path = ProviderLibraries::defaultDirectory() + "/history/libQuenx_History.so";
-    // Never unloaded: where a disk hangs, the history's thread is in it when everybody else has left.
-    void* const library = dlopen(path.c_str(), RTLD_NOW | RTLD_LOCAL | RTLD_NODELETE);
-    if (library == nullptr) return path + ": " + loaderReason(path);
+    // Where a disk hangs, the history's thread is in the library when everybody else has left.
+    const LibraryEntry entry("history/libQuenx_History.so", "quenx_openHistory");
     using Open = void (*)(ProviderSession&);
-    const auto open = reinterpret_cast<Open>(dlsym(library, "quenx_openHistory"));
-    if (open == nullptr) return path + ": " + loaderReason(path);
-    open(*this);
-    return "";
+    if (entry.address() != nullptr) reinterpret_cast<Open>(entry.address())(*this);
+    return entry.problem();
 }
 
 ProviderSession::ProviderSession(const std::string& configurationFile, const std::string& policyFile)
@@ -93,7 +96,11 @@ ProviderSession::ProviderSession(const std::string& configurationFile, const std
     if (!configurationFile.empty()) m_configuration.emplace(configurationFile);
     m_operations = std::make_shared<CimRequests>(utils::SMASHv2Config::getInstance()->getNamespace());
     // For the log: who has made a mistake is to hear of it before somebody needs an update.
-    m_policy.problem();
+    try {
+        if (m_policy.current()->trust != utils::TrustRule::Off) m_verifier.load();
+    } catch (const utils::PolicyError&) {
+        // Nothing is installed until it is mended.
+    }
 }
 
 }  // namespace core

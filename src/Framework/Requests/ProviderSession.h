@@ -7,6 +7,7 @@
 #include <vector>
 
 #include "Framework/Requests/CimOperations.h"
+#include "Framework/Requests/ImageVerifier.h"
 #include "Framework/Requests/UpdateSink.h"
 #include "Utils/Os/Linux/LinuxOSLocker.h"
 #include "Utils/Os/Linux/PolicyFile.h"
@@ -53,6 +54,24 @@ class QUENX_EXPORT ProviderLibraries {
     std::vector<Problem> m_problems;
 };
 
+/// An operation of a library that fronts load by its name because they cannot link it. It stays loaded: its
+/// threads and what it was asked for may outlive whoever loaded it.
+class LibraryEntry {
+  public:
+    /// @param library  below the directory of the framework's own
+    /// @param name     that the library exports it by
+    LibraryEntry(const std::string& library, const char* name);
+
+    /// Null where it cannot be had.
+    void* address() const { return m_address; }
+    /// Why not: the file, and the loader's words.
+    const std::string& problem() const { return m_problem; }
+
+  private:
+    void* m_address = nullptr;
+    std::string m_problem;
+};
+
 /// What every front holds while it serves: the providers' configuration, the policy that they obey, the
 /// locker under which they write to adapters, and their libraries. Leaving waits for the updates that have
 /// begun. One at a time in a process; used from one thread, but for the operations.
@@ -95,6 +114,7 @@ class QUENX_EXPORT ProviderSession {
     std::optional<utils::SMASHv2Config> m_configuration;
     utils::PolicyFile m_policy;
     os::OSLockerLinux m_locker;
+    LoadedVerifier m_verifier;
     std::optional<InstalledSink> m_history;
     ProviderLibraries m_libraries;
     std::shared_ptr<void> m_agent;

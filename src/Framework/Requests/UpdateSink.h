@@ -35,6 +35,7 @@ struct UpdateAttempt {
     std::vector<std::uint16_t> options;
     std::vector<std::string> values;              ///< beside the options
     ImageFacts image;                             ///< empty while the image was not read
+    std::string signedBy = {};                    ///< the key by which the image is trusted
     std::vector<utils::FirmwareType> types = {};  ///< to install; of an accepted update
     std::string job = {};                         ///< its id; of an accepted update
     std::int64_t mostRecords = 100'000;           ///< that the policy lets a history keep

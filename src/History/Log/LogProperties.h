@@ -33,6 +33,7 @@ inline constexpr LogProperty<std::string> kLogTexts[] = {
     {"SerialNumber", &Record::serial},
     {"URI", &Record::uri},
     {"ImageSHA256", &Record::sha256},
+    {"SignedBy", &Record::signedBy},
     {"ImageVersions", &Record::imageVersions},
     {"ImageTypes", &Record::types},
     {"InstallOptions", &Record::options},

@@ -8,6 +8,7 @@
 #include <span>
 
 #include "MidAPI/ma.h"
+#include "Providers/SoftwareUpdate/ImageTrust.h"
 #include "Providers/SoftwareUpdate/MethodResults.h"
 #include "Providers/SoftwareUpdate/Quenx_ConcreteJob.h"
 #include "Providers/SoftwareUpdate/Quenx_SoftwareInstallationService.h"
@@ -106,9 +107,11 @@ class ImageFile {
         errno = 0;
         m_file = look();
         const bool isMissing = errno == ENOENT || errno == ENOTDIR;
-        if (parsed.IsUriAccesible(m_file)) return;
-        core::NotedCall::noteReason(isMissing ? Id::FileMissing : Id::FileNotOpened);
-        throw EUriDoesNotExist(utils::formatStr("URI: %s is invalid", m_uri.c_str()));
+        if (!parsed.IsUriAccesible(m_file)) {
+            core::NotedCall::noteReason(isMissing ? Id::FileMissing : Id::FileNotOpened);
+            throw EUriDoesNotExist(utils::formatStr("URI: %s is invalid", m_uri.c_str()));
+        }
+        requireAllowedPlace(m_uri, m_file);
     }
 
     /// The adapter API counts in 32 bits.
@@ -119,6 +122,8 @@ class ImageFile {
                         m_limits.largest);
             refuse(Id::FileTooLarge);
         }
+        if (const std::int64_t most = largestAllowedImage(); most != 0 && m_file.size > most)
+            refuseTooLarge(m_uri, m_file.size);
         return size;
     }
 
@@ -128,6 +133,9 @@ class ImageFile {
         if (m_file.count != static_cast<std::size_t>(m_file.size)) refuse(Id::FileNotRead);
         return std::move(m_file.bytes);
     }
+
+    /// Of the file that was opened, where that is known.
+    const std::string& path() const { return m_file.realPath.empty() ? m_path : m_file.realPath; }
 
   private:
     [[noreturn]] void refuse(Id reason) const {
@@ -234,6 +242,8 @@ PreparedImage readAndPrepare(const UpdateOrder& order, bool& isAskingAdapter) {
     // judged.
     std::optional<UpdateReport::Examination> examination(
         std::in_place, std::span<const std::uint8_t>(source.get(), fileSize));
+    // Before anything takes the bytes for an image: who made them is not known until then.
+    requireTrust(uri, file.path(), {source.get(), fileSize}, adapterName);
     Buffer image = std::make_unique_for_overwrite<std::uint8_t[]>(fileSize);
     std::uint32_t imageSize = fileSize;
     std::vector<utils::FirmwareType> types = getTargetTypes(options, values);

@@ -95,6 +95,12 @@ void UpdateReport::noteReason(std::string_view text) noexcept try {
 } catch (const std::bad_alloc&) {
 }
 
+void UpdateReport::noteKey(const std::string& key) noexcept try {
+    if (current != nullptr) current->m_attempt.signedBy = key;
+    core::NotedCall::noteKey(key);
+} catch (const std::bad_alloc&) {
+}
+
 UpdateReport::Examination::Examination(std::span<const std::uint8_t> file) {
     core::UpdateSink* const sink = core::UpdateSink::installed();
     if (sink != nullptr && core::NotedCall::isCollecting()) m_facts = sink->examine(file);

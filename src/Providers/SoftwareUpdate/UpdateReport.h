@@ -40,6 +40,8 @@ class UpdateReport {
         core::NotedCall::noteReason(id);
         noteReason(text);
     }
+    /// The key by which the image is trusted.
+    static void noteKey(const std::string& key) noexcept;
     /// Looks at the bytes of an image while a scope prepares it.
     class Examination {
       public:

@@ -110,6 +110,14 @@ void readFrom(int file, Reading& reading) {
     }
 }
 
+/// Of the file that is open: what its path leads to can be another one by now.
+std::string realPathOf(int file) noexcept try {
+    std::error_code error;
+    return std::filesystem::read_symlink("/proc/self/fd/" + std::to_string(file), error).string();
+} catch (const std::bad_alloc&) {
+    return {};
+}
+
 void carryOut(Reading& reading) {
     struct stat status {};
     // A path with a NUL in it names nothing, and must not open what its head names.
@@ -131,6 +139,7 @@ void carryOut(Reading& reading) {
     found.kind = isKnown ? kindOf(status) : FileKind::CannotBeLookedAt;
     if (found.kind != FileKind::Regular) return;
     found.size = status.st_size;
+    found.realPath = realPathOf(file.number());
     if (found.size <= reading.most) readFrom(file.number(), reading);
 }
 

@@ -38,6 +38,8 @@ struct FileLook {
     std::unique_ptr<std::uint8_t[]> bytes;
     std::size_t count = 0;         ///< how many could be read; fewer than `size` if the file shrank
     bool isWithoutMemory = false;  ///< there was no room for `size` bytes
+    /// Where the file was that was opened, without links; empty where the system does not tell.
+    std::string realPath = {};
 };
 
 /// Opens what the path names, once, and reads a regular file of at most `most` bytes whole. Only regular
