@@ -154,7 +154,7 @@ class InstallVerbTest : public ::testing::Test {
             .connection = connection,
             .out = m_out,
             .error = m_error,
-            .json = false,
+            .json = m_isJson,
             .progress = progress,
             .following = {.pause = [] {}, .interrupted = [this] { return m_isInterrupted; }},
             .ask = [this](const std::string&, const std::function<bool()>&) { return m_answer; }};
@@ -180,6 +180,7 @@ class InstallVerbTest : public ::testing::Test {
     cli::ManyOptions m_many;
     std::shared_ptr<history::History> m_history;
     bool m_isForced = false;
+    bool m_isJson = false;
     std::optional<std::string> m_answer;  ///< of the user
 };
 
@@ -274,6 +275,10 @@ TEST_F(InstallVerbTest, BelievesNoSuccessThatCannotBeSeen) {
     EXPECT_EQ(install(), ExitStatus::Failed);
     EXPECT_NE(m_error.str().find("eth0 ended without an error, but eth0 has IMG_PXE 1, IMG_UEFI 0"),
               std::string::npos);
+    m_isJson = true;
+    EXPECT_EQ(install(), ExitStatus::Failed);
+    EXPECT_NE(m_out.str().find("\"reasonId\": \"QX-0707\""), std::string::npos);
+    m_isJson = false;
     m_service->jobs = {job(4, 100), job(10, 100)};
     EXPECT_EQ(install(), ExitStatus::Failed);
     EXPECT_EQ(m_lines.str(), "eth0: 0 %, 0 B of 2.0 KiB\neth0: 99 %, 2.0 KiB of 2.0 KiB\n");

@@ -132,7 +132,7 @@ TEST_F(KilledUpdateTest, LeavesARecordThatTellsWhatTheAdapterHas) {
             continue;
         }
         ++interrupted;
-        EXPECT_EQ(record.outcome, "interrupted");
+        EXPECT_EQ(record.outcome + " " + record.reasonId, "interrupted QX-0710");
         EXPECT_THAT(
             record.reason,
             ::testing::EndsWith((found.components == before ? "still has " : "now has ") + found.components));

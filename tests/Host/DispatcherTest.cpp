@@ -291,10 +291,10 @@ TEST_F(DispatcherTest, LeavesOneAuditLineForEachChangeAndRefusal) {
                                  R"(outcome="returned 12, Job=root/cimv2:Test_Gadget.ID=\"a\",Number=1")");
     EXPECT_EQ(lines[1].text, who + R"("deleteinstance")" + target + R"(arguments="" outcome="done")");
     EXPECT_EQ(lines[2].text, "[audit] user=\"" + name + R"(" address="192.0.2.1" operation="Work")" + target +
-                                 R"(arguments="" outcome="denied: user )" + name + " may only read\"");
-    EXPECT_LT(lines[3].text.size(), 1300U);
+                                 R"(arguments="" outcome="denied: user )" + name + R"( may only read" reason="QX-0502")");
+    EXPECT_LT(lines[3].text.size(), 1400U);
     EXPECT_NE(lines[3].text.find(std::string(64, 'u') + R"(\..." address="192.0.2.1")"), std::string::npos);
-    const std::string cut = "=\"denied: user " + std::string(256 - 13, 'u') + R"(\...")";
+    const std::string cut = "=\"denied: user " + std::string(256 - 13, 'u') + R"(\..." reason="QX-0502")";
     EXPECT_TRUE(lines[3].text.ends_with(cut)) << lines[3].text;
 }
 

@@ -12,6 +12,7 @@
 namespace {
 
 using test::RawConnection;
+using ::testing::ContainsRegex;
 using ::testing::HasSubstr;
 
 constexpr const char* kAdmin = "Authorization: Basic YWRtaW46YWRtaW4=";
@@ -110,6 +111,8 @@ TEST_P(ClaimTest, OfACheckStaysUntilItIsFreedUnlessThePolicyGivesItBack) {
         EXPECT_EQ(refused.status, 1);
         EXPECT_THAT(refused.error, HasSubstr("eth0 is held by a check of admin, which has ended.\n"
                                              "Free it with \"quenxctl release eth0\""));
+        // No history is served here: the answer itself has the id.
+        EXPECT_THAT(remote(install + " --force --json").out, HasSubstr("\"reasonId\": \"QX-0402\""));
         EXPECT_THAT(remote("status").out, HasSubstr("\neth0 (simulated)  a check of admin  20"));
         EXPECT_EQ(remote("release eth1").out, "eth1 was not held.\n");
         EXPECT_EQ(remote("release 0000:03:00.0").out, "eth0 is free again.\n");
@@ -117,7 +120,12 @@ TEST_P(ClaimTest, OfACheckStaysUntilItIsFreedUnlessThePolicyGivesItBack) {
     EXPECT_EQ(remote(install).status, 0);
     EXPECT_THAT(remote("status").out,
                 HasSubstr("\neth0 (simulated)  -        -      -    Completed (Quenx:"));
+    EXPECT_EQ(remote("check --force --target eth0 " + m_daemon.image()).status, 0);
+    EXPECT_THAT(remote("check --json --target eth0 file:///none").out,
+                HasSubstr("\"reasonId\": \"QX-0202\""));
     const std::string lines = m_daemon.stop().out;
+    EXPECT_THAT(lines, ContainsRegex("operation=\"CheckImage\" .* sha256=\"[0-9a-f]+\""));
+    EXPECT_THAT(lines, ContainsRegex("operation=\"CheckImage\" .* reason=\"QX-0202\""));
     const std::string freed = "operation=\"ReleaseClaim\" target=\"eth0\" arguments=\"\" outcome=\"done\"";
     EXPECT_EQ(test::contains(lines, freed), !GetParam()) << lines;
 }

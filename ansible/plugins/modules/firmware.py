@@ -196,7 +196,7 @@ def adapter_of(result):
         "before": versions(result["before"]),
         "after": versions(result["after"]),
         "reset_needed": result["resetNeeded"],
-        "reason_id": result.get("reason"),
+        "reason_id": result.get("reasonId"),
         "job": (result["job"] or {}).get("id"),
         "history_id": result.get("historyId"),
     }

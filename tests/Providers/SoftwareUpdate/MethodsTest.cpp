@@ -244,6 +244,7 @@ TEST_F(SiblingsTest, WhatTheyThrowIsAnUnspecifiedError) {
     OtherController::isFailing = true;
     const test::CallResult result = install(goodImage(), m_controller);
     EXPECT_EQ(result.returnValue, MethodReturn::UnspecifiedError);
+    EXPECT_EQ(result.reason, core::ReasonId::LookUpFailed);
     EXPECT_EQ(result.error, "");
     EXPECT_TRUE(test::SyslogCapture::contains("Unspecified Error for '" + m_controller.toString() + "'"));
     EXPECT_EQ(claim(), "");
