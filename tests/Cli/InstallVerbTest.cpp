@@ -276,6 +276,7 @@ TEST_F(InstallVerbTest, BelievesNoSuccessThatCannotBeSeen) {
     EXPECT_NE(m_error.str().find("eth0 ended without an error, but eth0 has IMG_PXE 1, IMG_UEFI 0"),
               std::string::npos);
     m_isJson = true;
+    m_service->jobs = {job(7, 100)};
     EXPECT_EQ(install(), ExitStatus::Failed);
     EXPECT_NE(m_out.str().find("\"reasonId\": \"QX-0707\""), std::string::npos);
     m_isJson = false;

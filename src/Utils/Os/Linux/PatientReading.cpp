@@ -7,8 +7,11 @@
 #include <unistd.h>
 
 #include <algorithm>
+#include <array>
 #include <cerrno>
+#include <climits>
 #include <condition_variable>
+#include <cstdio>
 #include <filesystem>
 #include <mutex>
 #include <new>
@@ -112,8 +115,12 @@ void readFrom(int file, Reading& reading) {
 
 /// Of the file that is open: what its path leads to can be another one by now.
 std::string realPathOf(int file) noexcept try {
-    std::error_code error;
-    return std::filesystem::read_symlink("/proc/self/fd/" + std::to_string(file), error).string();
+    // Nothing whose templates other libraries have too: the loader would take theirs, and never unmap them.
+    std::array<char, 32> link{};
+    std::snprintf(link.data(), link.size(), "/proc/self/fd/%d", file);
+    std::array<char, PATH_MAX> path{};
+    const ssize_t length = ::readlink(link.data(), path.data(), path.size());
+    return length < 0 ? std::string() : std::string(path.data(), static_cast<std::size_t>(length));
 } catch (const std::bad_alloc&) {
     return {};
 }
