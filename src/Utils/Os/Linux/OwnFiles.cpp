@@ -5,6 +5,7 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <cerrno>
 #include <cstdlib>
 #include <filesystem>
@@ -89,6 +90,32 @@ bool closeFolderToOthers(const std::string& path) {
     requireSafePlace(folder, path, purpose);
     if (!closeToOthers(folder.number())) fail(errno, "cannot protect the folder " + path);
     return true;
+}
+
+std::string whoElseMayChange(const Descriptor& opened, const std::string& path) {
+    struct stat status {};
+    if (::fstat(opened.number(), &status) != 0) fail(errno, "cannot look at " + path);
+    // Whoever owns something can write to it, whatever its mode is now.
+    if (status.st_uid != 0 && status.st_uid != ::geteuid())
+        return "belongs to user " + std::to_string(status.st_uid) +
+               ", who could change it; run: chown root " + path;
+    if ((status.st_mode & (S_IWGRP | S_IWOTH)) != 0)
+        return "can be changed by others than its owner; run: chmod go-w " + path;
+    return "";
+}
+
+std::string readUpTo(const Descriptor& file, std::size_t most) {
+    constexpr std::size_t kPiece = 4096;
+    std::string text;
+    while (text.size() < most) {
+        const std::size_t length = text.size();
+        text.resize(std::min(most, length + kPiece));
+        const ssize_t got = ::read(file.number(), text.data() + length, text.size() - length);
+        if (got < 0 && errno != EINTR) fail(errno, "cannot read");
+        text.resize(length + static_cast<std::size_t>(std::max<ssize_t>(got, 0)));
+        if (got == 0) break;
+    }
+    return text;
 }
 
 void writeAll(int file, std::span<const std::uint8_t> bytes, const std::string& what) {

@@ -15,6 +15,8 @@
 /// std::system_error, which names the file and the reason; any thread may call.
 namespace os {
 
+class Descriptor;
+
 /// Another user's file or folder in the place of one of this user's. what() says what to do, too.
 class QUENX_EXPORT ForeignFile : public std::runtime_error {
   public:
@@ -38,6 +40,15 @@ QUENX_EXPORT bool closeToOthers(int descriptor) noexcept;
 /// exchange, because the one that it lies in is theirs (ForeignFile) or writable for all
 /// (std::runtime_error). False when there is none.
 QUENX_EXPORT bool closeFolderToOthers(const std::string& path);
+
+/// How others than root and this user could change an open file or folder, and what ends that: "belongs to
+/// user 5, who could change it; run: chown root PATH". Empty where they cannot.
+/// @param path  for the text
+QUENX_EXPORT std::string whoElseMayChange(const Descriptor& opened, const std::string& path);
+
+/// The bytes from the file's position on, `most` of them or as many as there are.
+/// @throws std::system_error  whose code is errno
+QUENX_EXPORT std::string readUpTo(const Descriptor& file, std::size_t most);
 
 /// Writes all bytes at the file's position.
 /// @param what  the beginning of the error's text: "cannot write to the flash"

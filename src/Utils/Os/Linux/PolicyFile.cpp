@@ -5,12 +5,12 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
-#include <array>
 #include <cerrno>
 #include <filesystem>
 #include <system_error>
 
 #include "Utils/Log.h"
+#include "Utils/Os/Linux/OwnFiles.h"
 #include "Utils/Os/Linux/linux.h"
 
 namespace utils {
@@ -32,36 +32,23 @@ std::atomic<PolicyFile*> newest{nullptr};
                      "; let the user of this program read it, or remove it");
 }
 
-/// Whoever owns something can write to it, whatever its mode is now.
 void requireOwn(const std::string& path, const os::Descriptor& opened, const std::string& subject,
                 const std::string& name) {
-    struct stat status {};
-    if (::fstat(opened.number(), &status) != 0) refuseReading(path, errno);
-    if (status.st_uid != 0 && status.st_uid != ::geteuid())
-        refuse(path, subject + " belongs to user " + std::to_string(status.st_uid) +
-                         ", who could change it; run: chown root " + name);
-    if ((status.st_mode & (S_IWGRP | S_IWOTH)) != 0)
-        refuse(path, subject + " can be changed by others than its owner; run: chmod go-w " + name);
+    const std::string problem = os::whoElseMayChange(opened, name);
+    if (!problem.empty()) refuse(path, subject + " " + problem);
 }
 
 std::string textOf(const std::string& path, const os::Descriptor& file) {
-    std::string text;
-    std::array<char, 4096> piece;
-    while (text.size() <= kLargest) {
-        const ssize_t got = ::read(file.number(), piece.data(), piece.size());
-        if (got < 0 && errno == EINTR) continue;
-        if (got < 0) refuseReading(path, errno);
-        // Who writes into the file in place, and not beside it, would allow everything until he is done.
-        if (got == 0 && text.empty()) refuse(path, "it is empty; write the policy there, or remove it");
-        if (got == 0) return text;
-        text.append(piece.data(), static_cast<std::size_t>(got));
-    }
-    refuse(path, "it is larger than 1 MiB; put only the keys of a policy there");
+    std::string text = os::readUpTo(file, kLargest + 1);
+    // Who writes into the file in place, and not beside it, would allow everything until he is done.
+    if (text.empty()) refuse(path, "it is empty; write the policy there, or remove it");
+    if (text.size() > kLargest) refuse(path, "it is larger than 1 MiB; put only the keys of a policy there");
+    return text;
 }
 
 /// Nothing when there is no such file. The folder is opened first and the file in it, so that what was looked
 /// at is what is read.
-std::optional<std::string> readSafely(const std::string& path) {
+std::optional<std::string> readSafely(const std::string& path) try {
     struct stat status {};
     // Before anything is opened: where no descriptor is free, a file that is not there could not be opened,
     // either.
@@ -80,6 +67,8 @@ std::optional<std::string> readSafely(const std::string& path) {
     requireOwn(path, folder, "its folder", place);
     requireOwn(path, file, "it", path);
     return textOf(path, file);
+} catch (const std::system_error& error) {
+    refuseReading(path, error.code().value());
 }
 
 }  // namespace
