@@ -130,6 +130,8 @@ constexpr Reason kReasons[] = {
      "Use quenxctl, quenx-cimd or libQuenx_Cmpi.so, with libQuenx_Trust.so installed.", kUnsupported},
     {Id::KeysFolderBad, "The folder of the trusted keys cannot be used.",
      "Make it and its files root's, and writable by nobody else.", kUnsupported},
+    {Id::ManifestBad, "The signed manifest cannot be read.",
+     "Have whoever signed it mend the line that the message names.", kUnsupported},
 
     {Id::FlashAdapterGone, "The adapter went before it was written to.",
      "Check that it is still in its slot and has its driver.", std::nullopt, 1},

@@ -79,6 +79,7 @@ enum class ReasonId : std::uint16_t {
     BelowLowestVersion = 610,
     NoVerifier = 611,
     KeysFolderBad = 612,
+    ManifestBad = 613,
 
     // the flash
     FlashAdapterGone = 701,
