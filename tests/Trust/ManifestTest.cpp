@@ -1,0 +1,112 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "Trust/Manifest.h"
+
+#include <gtest/gtest.h>
+
+#include "Control/Sha256.h"
+#include "Support/Program.h"
+#include "Trust/Workshop.h"
+
+namespace {
+
+using core::ReasonId;
+using core::TrustVerdict;
+
+class ManifestTest : public testing::Test {
+  protected:
+    ManifestTest() {
+        workshop.makeKey("acme");
+        workshop.pin("acme");
+    }
+
+    /// A right one, in which a part is replaced.
+    std::string text(const std::string& part = "", const std::string& by = "") const {
+        control::Sha256 sum;
+        sum.add(workshop.bytes.data(), workshop.bytes.size());
+        std::string all = "name = \"port.rom\"\nsize = " + std::to_string(workshop.bytes.size()) +
+                          "\nsha256 = \"" + sum.take() +
+                          "\"\npci_ids = [\"8086:10fb\", \"1AF4:1041:1af4:1100\"]\n"
+                          "versions = { IMG_PXE = \"2.1\" }\nlowest_versions = { IMG_PXE = \"2.0\" }\n";
+        const std::size_t place = all.find(part);
+        EXPECT_NE(place, std::string::npos) << part;
+        return all.replace(place, part.size(), by);
+    }
+
+    TrustVerdict verdictOn(const std::string& manifest) const {
+        workshop.writeManifest(manifest, "acme");
+        return workshop.judge();
+    }
+
+    test::Workshop workshop;
+};
+
+using Versions = std::vector<std::pair<std::string, std::string>>;
+
+TEST_F(ManifestTest, IsTrustedForItsImageAndItsDevices) {
+    TrustVerdict verdict = verdictOn(text());
+    EXPECT_TRUE(verdict.isTrusted()) << verdict.text;
+    EXPECT_EQ(verdict.key, "acme");
+    EXPECT_EQ(verdict.versions, (Versions{{"IMG_PXE", "2.1"}}));
+    EXPECT_EQ(verdict.lowest, (Versions{{"IMG_PXE", "2.0"}}));
+    workshop.ids = {{0x8086, 0x10fb, 1, 2}};
+    EXPECT_TRUE(workshop.judge().isTrusted());
+    workshop.ids = {{0x1af4, 0x1041, 0x1af4, 0x1101}};
+    EXPECT_EQ(workshop.judge().reason, ReasonId::ManifestForOtherDevice);
+    workshop.ids = std::nullopt;
+    EXPECT_EQ(workshop.judge().reason, ReasonId::ManifestForOtherDevice);
+}
+
+TEST_F(ManifestTest, ServesNoOtherImageAndHasNoOtherKeys) {
+    const struct {
+        const char* part;
+        const char* by;
+        ReasonId reason;
+        const char* said;
+    } cases[] = {
+        {"port.rom", "card.rom", ReasonId::ManifestForOtherImage,
+         "is for \"card.rom\", not for \"port.rom\""},
+        {"size = ", "size = 1", ReasonId::ManifestDiffers, "bytes, and the image has "},
+        {"sha256 = \"", "sha256 = \"0", ReasonId::ManifestBad, "64 hexadecimal digits in lower case"},
+        {"pci_ids", "pci_id", ReasonId::ManifestBad, "line 4: the manifest: unknown key \"pci_id\""},
+        {"\"8086:10fb\", ", "\"8086\", ", ReasonId::ManifestBad, "line 4: the manifest: \"pci_ids\" must be"},
+        {"\"8086:10fb\", \"1AF4:1041:1af4:1100\"", "", ReasonId::ManifestBad, "\"pci_ids\" must be"},
+        {"\"2.0\"", "2.0", ReasonId::ManifestBad, "line 6: lowest_versions: \"IMG_PXE\" must be a text"},
+        {"{ IMG_PXE = \"2.1\" }", "\"2.1\"", ReasonId::ManifestBad,
+         "line 5: the manifest: \"versions\" must"},
+        {"name = \"port.rom\"\n", "", ReasonId::ManifestBad, "\"name\" is missing"},
+        {"size = ", "size = -", ReasonId::ManifestBad,
+         "line 2: the manifest: \"size\" must be a whole number"},
+        {"name", "[[[", ReasonId::ManifestBad, "port.rom.manifest.toml, line 1: "},
+    };
+    for (const auto& one : cases) {
+        const TrustVerdict verdict = verdictOn(text(one.part, one.by));
+        EXPECT_EQ(verdict.reason, one.reason) << one.by << verdict.text;
+        EXPECT_TRUE(test::contains(verdict.text, one.said)) << verdict.text;
+    }
+}
+
+TEST_F(ManifestTest, NamesTheImageByItsSum) {
+    workshop.writeManifest(text(), "acme");
+    workshop.bytes.back() ^= 1;
+    const TrustVerdict verdict = workshop.judge();
+    EXPECT_EQ(verdict.reason, ReasonId::ManifestDiffers);
+    EXPECT_TRUE(test::contains(verdict.text, "names the SHA-256 ")) << verdict.text;
+}
+
+TEST_F(ManifestTest, AloneCountsWhereItIs) {
+    workshop.sign(workshop.image, "acme");
+    ASSERT_TRUE(workshop.judge().isTrusted());
+    const std::string manifest = workshop.folder.write("port.rom.manifest.toml", text());
+    EXPECT_EQ(workshop.judge().reason, ReasonId::NotSigned);
+    workshop.writeManifest(text(), "acme");
+    ASSERT_TRUE(workshop.judge().isTrusted());
+    // One that was changed after it had been signed.
+    workshop.folder.write("port.rom.manifest.toml", text("2.0", "1.0"));
+    EXPECT_EQ(workshop.judge().reason, ReasonId::SignatureWrong);
+    std::filesystem::remove(manifest);
+    const TrustVerdict verdict = workshop.judge();
+    EXPECT_EQ(verdict.reason, ReasonId::NotSigned);
+    EXPECT_TRUE(test::contains(verdict.text, "port.rom.manifest.toml is not there")) << verdict.text;
+}
+
+}  // namespace
