@@ -48,10 +48,8 @@ std::vector<DeviceIds> readDevices(const TomlTable& table, std::string_view key)
     return devices;
 }
 
-std::vector<std::pair<std::string, std::string>> readVersions(const TomlTable& table,
-                                                              const toml::table& parsed,
-                                                              std::string_view key) {
-    std::vector<std::pair<std::string, std::string>> versions;
+std::vector<NamedText> readVersions(const TomlTable& table, const toml::table& parsed, std::string_view key) {
+    std::vector<NamedText> versions;
     const toml::node* const node = parsed.get(key);
     if (node == nullptr) return versions;
     const toml::table* const found = node->as_table();
@@ -90,8 +88,8 @@ void requireDevice(const Manifest& manifest, const core::ImageToVerify& image, c
     if (!image.pciIds)
         throw Refusal(ReasonId::ManifestForOtherDevice,
                       path + " is for some devices only, and the adapter does not tell its PCI ids");
+    if (isForDevice(manifest, image)) return;
     const std::array<std::uint16_t, 4>& ids = *image.pciIds;
-    if (std::ranges::any_of(manifest.devices, [&](const DeviceIds& each) { return fits(each, ids); })) return;
     throw Refusal(ReasonId::ManifestForOtherDevice,
                   path + utils::formatStr(" is not for the adapter, which is %04x:%04x:%04x:%04x", ids[0],
                                           ids[1], ids[2], ids[3]));
@@ -103,6 +101,12 @@ Manifest parseManifest(std::string_view text, const std::string& path) try {
     return readManifest(utils::parseToml(text));
 } catch (const utils::TomlError& error) {
     throw Refusal(ReasonId::ManifestBad, error.in(path));
+}
+
+bool isForDevice(const Manifest& manifest, const core::ImageToVerify& image) {
+    return image.pciIds && std::ranges::any_of(manifest.devices, [&](const DeviceIds& each) {
+               return fits(each, *image.pciIds);
+           });
 }
 
 void requireManifestFor(const Manifest& manifest, const core::ImageToVerify& image, const std::string& path) {

@@ -20,6 +20,9 @@ struct DeviceIds {
     std::optional<std::array<std::uint16_t, 2>> subsystem;  ///< its vendor and device; nothing for any
 };
 
+/// A type of image, or a version of a driver, and a version of it.
+using NamedText = std::pair<std::string, std::string>;
+
 /// What a signed manifest says of one image. The keys of the file have these names, in TOML:
 ///
 ///     name = "port.rom"
@@ -33,8 +36,8 @@ struct Manifest {
     std::uint64_t size = 0;  ///< bytes
     std::string sha256;
     std::vector<DeviceIds> devices;
-    std::vector<std::pair<std::string, std::string>> versions;  ///< by the names of the types
-    std::vector<std::pair<std::string, std::string>> lowest;    ///< that may be installed
+    std::vector<NamedText> versions;
+    std::vector<NamedText> lowest;  ///< that may be installed from now on, of this image or another
 };
 
 /// @param path  for the texts
@@ -44,5 +47,8 @@ Manifest parseManifest(std::string_view text, const std::string& path);
 /// @throws Refusal  ManifestForOtherImage, ManifestDiffers, ManifestForOtherDevice for a manifest that is not
 ///                  of this image, or not for this adapter, also where the adapter's ids are not known
 void requireManifestFor(const Manifest& manifest, const core::ImageToVerify& image, const std::string& path);
+
+/// Whether the manifest is for an adapter with these ids; no for one that does not tell them.
+bool isForDevice(const Manifest& manifest, const core::ImageToVerify& image);
 
 }  // namespace trust

@@ -5,10 +5,15 @@
 #include <ctime>
 #include <span>
 #include <string>
+#include <string_view>
 
 #include "Trust/Keys.h"
 
 namespace trust {
+
+inline std::span<const std::uint8_t> bytesOf(std::string_view text) {
+    return {reinterpret_cast<const std::uint8_t*>(text.data()), text.size()};
+}
 
 /// Verifies a detached signature: CMS SignedData (RFC 5652) in DER, with SHA-256 or a stronger digest. Of
 /// several signers one that is trusted is enough. A certificate has to be valid at the time that the signer

@@ -40,14 +40,10 @@ class ManifestTest : public testing::Test {
     test::Workshop workshop;
 };
 
-using Versions = std::vector<std::pair<std::string, std::string>>;
-
 TEST_F(ManifestTest, IsTrustedForItsImageAndItsDevices) {
     TrustVerdict verdict = verdictOn(text());
     EXPECT_TRUE(verdict.isTrusted()) << verdict.text;
     EXPECT_EQ(verdict.key, "acme");
-    EXPECT_EQ(verdict.versions, (Versions{{"IMG_PXE", "2.1"}}));
-    EXPECT_EQ(verdict.lowest, (Versions{{"IMG_PXE", "2.0"}}));
     workshop.ids = {{0x8086, 0x10fb, 1, 2}};
     EXPECT_TRUE(workshop.judge().isTrusted());
     workshop.ids = {{0x1af4, 0x1041, 0x1af4, 0x1101}};
@@ -83,6 +79,26 @@ TEST_F(ManifestTest, ServesNoOtherImageAndHasNoOtherKeys) {
         EXPECT_EQ(verdict.reason, one.reason) << one.by << verdict.text;
         EXPECT_TRUE(test::contains(verdict.text, one.said)) << verdict.text;
     }
+}
+
+TEST_F(ManifestTest, RulesOutOlderImagesOfTheDevice) {
+    workshop.makeKey("stranger");
+    const std::string next = text("{ IMG_PXE = \"2.0\" }", "{ IMG_PXE = \"2.2\" }");
+    EXPECT_TRUE(verdictOn(text()).isTrusted());
+    workshop.writeManifest(next, "stranger", "next.rom");
+    EXPECT_TRUE(workshop.judge().isTrusted()) << "who is not trusted rules out nothing";
+    workshop.writeManifest(next, "acme", "next.rom");
+    TrustVerdict verdict = workshop.judge();
+    EXPECT_EQ(verdict.reason, ReasonId::BelowLowestVersion);
+    EXPECT_TRUE(test::contains(verdict.text, "the image has IMG_PXE 2.1, and ")) << verdict.text;
+    EXPECT_TRUE(test::contains(verdict.text, "next.rom.manifest.toml allows IMG_PXE 2.2 or newer"));
+    // Of other types there may be any, and what runs on other devices does not matter.
+    EXPECT_TRUE(verdictOn(text("versions = { IMG_PXE", "versions = { IMG_UEFI")).isTrusted());
+    EXPECT_EQ(verdictOn(text("versions = { IMG_PXE = \"2.1\" }\n")).reason, ReasonId::BelowLowestVersion);
+    EXPECT_TRUE(verdictOn(text("\"2.1\"", "\"2.10\"")).isTrusted());
+    workshop.writeManifest(text("\"8086:10fb\", \"1AF4:1041:1af4:1100\"", "\"8086:10fb\""), "acme",
+                           "next.rom");
+    EXPECT_TRUE(verdictOn(text()).isTrusted());
 }
 
 TEST_F(ManifestTest, NamesTheImageByItsSum) {

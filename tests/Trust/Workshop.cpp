@@ -82,9 +82,9 @@ std::string Workshop::sign(const std::string& path, const std::string& key, cons
     return signature;
 }
 
-void Workshop::writeManifest(const std::string& text, const std::string& key) const {
-    const std::string manifest = folder.write("port.rom.manifest.toml", text);
-    std::filesystem::rename(sign(manifest, key), folder / "port.rom.manifest.p7s");
+void Workshop::writeManifest(const std::string& text, const std::string& key, const std::string& name) const {
+    const std::string manifest = folder.write(name + ".manifest.toml", text);
+    std::filesystem::rename(sign(manifest, key), folder / name + ".manifest.p7s");
 }
 
 core::TrustVerdict Workshop::judge(std::time_t (*clock)()) const {

@@ -25,8 +25,9 @@ class Workshop {
     void pin(const std::string& name) const;
     /// Makes the detached signature of a file by a key, beside it.
     std::string sign(const std::string& path, const std::string& key, const Options& more = {}) const;
-    /// Gives the image a signed manifest with this text.
-    void writeManifest(const std::string& text, const std::string& key) const;
+    /// Gives an image a signed manifest with this text.
+    void writeManifest(const std::string& text, const std::string& key,
+                       const std::string& name = "port.rom") const;
 
     std::string operator/(const std::string& name) const { return folder / name; }
 

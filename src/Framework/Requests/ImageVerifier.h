@@ -7,6 +7,7 @@
 #include <optional>
 #include <span>
 #include <string>
+#include <vector>
 
 #include "Framework/Requests/Reasons.h"
 #include "Utils/Export.h"
@@ -22,6 +23,9 @@ struct ImageToVerify {
     std::string keysFolder;               ///< with the certificates that are trusted
     /// Vendor, device, and those of the subsystem; nothing where the adapter does not tell.
     std::optional<std::array<std::uint16_t, 4>> pciIds;
+    /// Where further images lie, whose manifests may tell the lowest version that is allowed; beside the
+    /// image's own folder.
+    std::vector<std::string> folders = {};
 };
 
 /// What came of it.

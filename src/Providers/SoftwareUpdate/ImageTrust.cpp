@@ -15,6 +15,7 @@
 #include "Providers/SoftwareUpdate/MethodResults.h"
 #include "Providers/SoftwareUpdate/UpdateReport.h"
 #include "Utils/Os/Linux/SMASHv2Config.h"
+#include "Utils/Os/Linux/linux.h"
 #include "Utils/Utils.h"
 
 namespace {
@@ -30,9 +31,28 @@ namespace fs = std::filesystem;
 bool isBelow(const std::string& file, const std::string& folder) {
     std::error_code isMissing;
     const fs::path whole = fs::canonical(folder, isMissing);
-    if (folder.empty() || isMissing) return false;
+    if (isMissing) return false;
     const fs::path path(file);
     return std::mismatch(whole.begin(), whole.end(), path.begin(), path.end()).first == whole.end();
+}
+
+/// Where the policy has images: what it names, and what the object manager fills itself.
+std::vector<std::string> foldersOf(const utils::Policy& policy) {
+    std::vector<std::string> folders = policy.imageDirectories.value_or(std::vector<std::string>());
+    folders.push_back(policy.keepImages);
+    folders.push_back(utils::SMASHv2Config::getInstance()->getUploadDirectory());
+    std::erase(folders, "");
+    return folders;
+}
+
+/// These, and those of the images that were sent, which have one each.
+std::vector<std::string> foldersWithManifests(const utils::Policy& policy) {
+    std::vector<std::string> folders = foldersOf(policy);
+    const std::string uploads = utils::SMASHv2Config::getInstance()->getUploadDirectory();
+    if (uploads.empty()) return folders;
+    for (const std::string& image : os::listDirectory(uploads))
+        folders.push_back(uploads + "/" + image);
+    return folders;
 }
 
 std::optional<std::array<std::uint16_t, 4>> pciIdsOf(const std::string& adapterName) try {
@@ -48,11 +68,8 @@ std::optional<std::array<std::uint16_t, 4>> pciIdsOf(const std::string& adapterN
 void requireAllowedPlace(const std::string& uri, const os::FileLook& file) {
     const utils::Policy& policy = core::PolicyDecision::policy();
     if (!policy.imageDirectories) return;
-    std::vector<std::string> folders = *policy.imageDirectories;
-    folders.push_back(policy.keepImages);
-    folders.push_back(utils::SMASHv2Config::getInstance()->getUploadDirectory());
-    if (std::ranges::any_of(folders, [&](const std::string& each) { return isBelow(file.realPath, each); }))
-        return;
+    const auto isIn = [&](const std::string& folder) { return isBelow(file.realPath, folder); };
+    if (std::ranges::any_of(foldersOf(policy), isIn)) return;
     refuse(
         core::ReasonId::OutsideImageDirectories, uri,
         (file.realPath.empty() ? "where it lies cannot be told" : "it is " + file.realPath) +
@@ -79,8 +96,8 @@ void requireTrust(const std::string& uri, const std::string& path, std::span<con
     if (verifier == nullptr)
         refuse(core::ReasonId::NoVerifier, uri,
                "the policy asks for a signature, and this program cannot verify any");
-    const core::TrustVerdict verdict =
-        verifier->verify({path, bytes, policy.trustKeys, pciIdsOf(adapterName)});
+    const core::TrustVerdict verdict = verifier->verify(
+        {path, bytes, policy.trustKeys, pciIdsOf(adapterName), foldersWithManifests(policy)});
     if (!verdict.isTrusted()) refuse(verdict.reason, uri, verdict.text);
     UpdateReport::noteKey(verdict.key);
 }
