@@ -23,8 +23,12 @@ inline constexpr const char* kVerificationHolds = "verification";
 inline constexpr const char* kCheckLeft = "check";
 
 /// POST {"uri", "target", "options", "values"}, as InstallFromURI takes them: {"returnValue": NUMBER}, as
-/// that method would return, 0 for an image that could be installed. No adapter is claimed.
+/// that method would return, 0 for an image that could be installed, and "signedBy", the key by which the
+/// policy trusts it, where it asks for one. No adapter is claimed.
 inline constexpr const char* kCheck = "/quenx/v1/check";
+
+/// POST {"uris"}: {"images": [{"uri", "asked", "key", "reasonId", "why"}]}, what the policy says of each.
+inline constexpr const char* kTrust = "/quenx/v1/trust";
 
 /// POST {"adapter"}: {"released": BOOLEAN}; 409 for a claim that is still needed.
 inline constexpr const char* kRelease = "/quenx/v1/release";

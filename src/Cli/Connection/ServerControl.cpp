@@ -13,6 +13,7 @@
 #include "Control/Interface.h"
 #include "Control/Sha256.h"
 #include "Framework/Model/CimError.h"
+#include "Framework/Requests/NotedCall.h"
 #include "Utils/Os/Linux/linux.h"
 #include "Utils/Utils.h"
 
@@ -146,7 +147,20 @@ std::optional<std::uint32_t> ServerControl::checkImage(const std::string& uri, c
                                                        const std::vector<std::string>& values) {
     const auto answer =
         post(control::kCheck, {{"uri", uri}, {"target", target}, {"options", options}, {"values", values}});
-    return answer ? std::optional(valueOf<std::uint32_t>(*answer, "returnValue")) : std::nullopt;
+    if (!answer) return std::nullopt;
+    core::NotedCall::noteKey(textOrNone(*answer, "signedBy"));
+    return valueOf<std::uint32_t>(*answer, "returnValue");
+}
+
+std::optional<std::vector<update::ImageTrust>> ServerControl::trustOf(const std::vector<std::string>& uris) {
+    const std::optional<json> answer = post(control::kTrust, {{"uris", uris}});
+    if (!answer) return std::nullopt;
+    std::vector<update::ImageTrust> images;
+    for (const json& image : valueOf<json>(*answer, "images"))
+        images.push_back({valueOf<bool>(image, "asked"), textOrNone(image, "key"),
+                          core::parseReasonCode(textOrNone(image, "reasonId")), textOrNone(image, "why")});
+    if (images.size() != uris.size()) refuseAnswer();
+    return images;
 }
 
 std::optional<std::string> ServerControl::sendFile(const std::string& file, const std::string& image) {

@@ -10,6 +10,7 @@
 #include <vector>
 
 #include "Cli/Connection/HttpClient.h"
+#include "Providers/Schema/ProviderInterfaces.h"
 #include "Utils/Time.h"
 
 namespace cli {
@@ -40,10 +41,12 @@ class ServerControl {
     /// Whether something was freed.
     std::optional<bool> release(const std::string& adapter);
     /// What InstallFromURI would return for these arguments, 0 for an image that could be installed. Claims
-    /// nothing.
+    /// nothing, and notes the key by which the image is trusted.
     std::optional<std::uint32_t> checkImage(const std::string& uri, const std::string& target,
                                             const std::vector<std::uint16_t>& options,
                                             const std::vector<std::string>& values);
+    /// What the policy of the server says of each of these images.
+    std::optional<std::vector<update::ImageTrust>> trustOf(const std::vector<std::string>& uris);
     /// Sends an image, and beside it the files that belong to it. Returns its URI there.
     std::optional<std::string> upload(const std::string& file);
 

@@ -280,6 +280,20 @@ Reason explainImage(const Connection& connection, std::uint32_t returnValue, con
     }
 }
 
+/// What the table of reasons has on the trust in images.
+constexpr unsigned kFirstOfTrust = 600;
+constexpr unsigned kLastOfTrust = 699;
+
+/// An image that the policy does not let be installed may be right in every other way.
+Reason explainTrust(const Connection& connection, std::uint32_t returnValue, const Candidate& candidate,
+                    core::ReasonId id) {
+    const core::Reason* row = core::findReason(id);
+    const auto number = static_cast<unsigned>(id);
+    if (row == nullptr || number < kFirstOfTrust || number > kLastOfTrust) return std::nullopt;
+    const std::string told = toldReason(connection, candidate.adapter.name, returnValue);
+    return Explanation{told.empty() ? row->text : sentence(told), row->advice};
+}
+
 /// Says that the old firmware is still there only when what was read back shows it.
 std::string readBackText(const Candidate& candidate, const std::vector<Component>& after, bool isBusy) {
     const std::vector<Component>& before = candidate.adapter.components;
@@ -311,7 +325,8 @@ std::string permissionAdvice(const std::string& reason) {
 }  // namespace
 
 Explanation explainRefusal(const Connection& connection, std::uint32_t returnValue,
-                           const Candidate& candidate) {
+                           const Candidate& candidate, core::ReasonId id) {
+    if (const Reason untrusted = explainTrust(connection, returnValue, candidate, id)) return *untrusted;
     // Who holds the adapter goes first: the image may be all right.
     Reason reason = explainHolder(connection, returnValue, candidate);
     // These two mean anything, of which nothing can be seen from afar.

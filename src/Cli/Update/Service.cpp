@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Cli/Update/Service.h"
 
+#include <algorithm>
+
 #include "Cli/Connection/ServerControl.h"
 #include "Framework/Classes/RequestScope.h"
 #include "Framework/Requests/Audit.h"
@@ -150,6 +152,26 @@ std::optional<std::uint32_t> verifyOnly(const Connection& connection, const Cand
         check->checkImage(candidate.uri, candidate.adapter.path, options.codes, options.values);
     call.audit(connection, core::outcomeOf(core::MethodResult{returned, {}}), noted);
     return returned;
+}
+
+std::optional<std::vector<update::ImageTrust>> readTrust(const Connection& connection,
+                                                         const std::vector<std::string>& uris) try {
+    std::optional<std::vector<update::ImageTrust>> told;
+    if (connection.control != nullptr) told = connection.control->trustOf(uris);
+    if (connection.isInProcess) {
+        const core::RequestScope scope;
+        core::CimPath service = findService(*connection.operations);
+        update::ImageCheck* check = update::findImageCheck(service);
+        if (check == nullptr) return std::nullopt;
+        told.emplace();
+        for (const std::string& uri : uris)
+            told->push_back(check->trustOf(uri));
+    }
+    const bool isAsked = told && std::ranges::any_of(*told, &update::ImageTrust::isAsked);
+    return isAsked ? told : std::nullopt;
+} catch (const core::CimError&) {
+    // What is beside the matter must not stand in its way.
+    return std::nullopt;
 }
 
 std::uint32_t checkIdentity(const Connection& connection, const Candidate& candidate) {

@@ -36,8 +36,10 @@ Outcome judge(const Connection& connection, const Candidate& candidate) {
     // A file that would be sent is not where the server could look at it.
     if (candidate.localFile.empty()) outcome.returnValue = verifyOnly(connection, candidate);
     outcome.reason = noted.notes().reason;
+    outcome.signedBy = noted.notes().signedBy;
     if (outcome.returnValue.value_or(MethodReturn::Completed) != MethodReturn::Completed) {
-        outcome.end(Ending::Refused, explainRefusal(connection, *outcome.returnValue, candidate));
+        outcome.end(Ending::Refused,
+                    explainRefusal(connection, *outcome.returnValue, candidate, outcome.reason));
         return outcome;
     }
     outcome.end(ExitStatus::Done, Ending::Installable,

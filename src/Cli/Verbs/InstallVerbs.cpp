@@ -109,7 +109,8 @@ void conclude(Context& context, const core::MethodResult& result, const Candidat
         readBack(*context.connection.operations, candidate, outcome);
         judgeCompleted(outcome, candidate);
     } else {
-        outcome.end(Ending::Refused, explainRefusal(context.connection, result.returnValue, candidate));
+        outcome.end(Ending::Refused,
+                    explainRefusal(context.connection, result.returnValue, candidate, outcome.reason));
     }
     // An update in this program may still run when nobody knows how it ends.
     if (outcome.ending != Ending::Unknown) context.following.over();
@@ -162,6 +163,7 @@ Outcome installCandidate(Context& context, const Candidate& named) {
     const core::NotedCall noted;
     const std::optional<core::MethodResult> result = start(context, candidate, outcome);
     outcome.reason = noted.notes().reason;
+    outcome.signedBy = noted.notes().signedBy;
     if (result) conclude(context, *result, candidate, outcome);
     outcome.historyId = ownRecordOf(context.connection, candidate.adapter);
     return outcome;
@@ -217,14 +219,15 @@ ExitStatus check(Context& context, const VerbOptions& options) {
     Outcome outcome(candidate);
     outcome.returnValue = returnValue;
     outcome.advice = advice;
+    outcome.signedBy = noted.notes().signedBy;
     if (returnValue != MethodReturn::Completed) {
         outcome.reason = noted.notes().reason;
-        outcome.end(Ending::Refused, explainRefusal(connection, *returnValue, candidate));
+        outcome.end(Ending::Refused, explainRefusal(connection, *returnValue, candidate, outcome.reason));
     } else if (!candidate.force && candidate.isAlreadyCurrent()) {
         outcome.endAsCurrent(candidate);
     } else {
         outcome.end(ExitStatus::Done, Ending::Installable,
-                    "The image can be installed on " + outcome.label + ".");
+                    "The image can be installed on " + outcome.label + "." + trustText(outcome.signedBy));
     }
     return print(context, outcome);
 }

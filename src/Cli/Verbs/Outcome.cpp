@@ -82,6 +82,7 @@ void to_json(Json& json, const Outcome& outcome) {
             {"after", outcome.after}};
     if (outcome.returnValue) json["returnValue"] = *outcome.returnValue;
     if (outcome.reason != core::ReasonId::None) json["reasonId"] = core::reasonCode(outcome.reason);
+    if (!outcome.signedBy.empty()) json["signedBy"] = outcome.signedBy;
     if (outcome.job) json["job"] = *outcome.job;
     if (outcome.historyId != 0) json["historyId"] = outcome.historyId;
     if (outcome.card) json["card"] = cardJson(*outcome.card);

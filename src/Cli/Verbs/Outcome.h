@@ -20,6 +20,11 @@ enum class Ending { Current, Updated, UpdatedResetPending, Refused, Failed, Unkn
 /// The word of an ending in tables and in the JSON member "outcome".
 const char* outcomeText(Ending ending);
 
+/// What follows a sentence on an image that is trusted by a key; nothing without one.
+inline std::string trustText(const std::string& key) {
+    return key.empty() ? "" : " It is trusted by " + key + ".";
+}
+
 /// How an install, or a check of one, ended: the same facts for a person and for a script.
 struct Outcome {
     explicit Outcome(const Candidate& candidate);
@@ -51,6 +56,7 @@ struct Outcome {
     std::string uri;
     std::optional<std::uint32_t> returnValue;      ///< of the method, when it was called
     core::ReasonId reason = core::ReasonId::None;  ///< why it was refused, or failed; none where nobody tells
+    std::string signedBy;                          ///< the key by which the image is trusted; empty for none
     std::optional<JobView> job;                    ///< when one was started
     std::int64_t historyId = 0;                    ///< its record in this machine's history; 0 for none
     std::vector<std::string> unchecked;            ///< what only the write can show

@@ -1,8 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
 // The verbs that only show what there is: adapters and identities, instances and their associations.
 #include <algorithm>
+#include <map>
 
 #include "Cli/Display/Output.h"
+#include "Cli/Update/Service.h"
 #include "Cli/Verbs/Verbs.h"
 
 namespace cli {
@@ -159,16 +161,57 @@ ExitStatus showAdapters(Context& context, const VerbOptions& options) {
     return ExitStatus::Done;
 }
 
+namespace {
+
+/// What the policy says of the images among the items, by their URIs; empty where it asks for no signatures.
+std::map<std::string, update::ImageTrust> trustOfImages(const Connection& connection,
+                                                        const std::vector<InventoryItem>& items) {
+    std::vector<std::string> uris;
+    for (const InventoryItem& item : items)
+        if (item.isInstallable()) uris.push_back(item.uri());
+    const auto told = readTrust(connection, uris);
+    std::map<std::string, update::ImageTrust> trust;
+    for (std::size_t i = 0; told && i < uris.size(); ++i)
+        trust[uris[i]] = (*told)[i];
+    return trust;
+}
+
+/// "trusted by release", "QX-0603 The image has no signature."
+std::string trustCell(const update::ImageTrust& trust) {
+    if (!trust.key.empty()) return "trusted by " + trust.key;
+    const core::Reason* row = core::findReason(trust.reason);
+    return row == nullptr ? trust.why : core::reasonCode(trust.reason) + " " + row->text;
+}
+
+Json identityJson(const InventoryItem& item, const std::map<std::string, update::ImageTrust>& trust) {
+    Json json = item;
+    if (const auto found = trust.find(item.uri()); found != trust.end()) {
+        json["signedBy"] = found->second.key.empty() ? Json() : Json(found->second.key);
+        json["reasonId"] = found->second.key.empty() ? Json(core::reasonCode(found->second.reason)) : Json();
+        json["reason"] = found->second.why;
+    }
+    return json;
+}
+
+}  // namespace
+
 ExitStatus showIdentities(Context& context, const VerbOptions&) {
     const std::vector<InventoryItem> items = readInventory(*context.connection.operations);
+    const auto trust = trustOfImages(context.connection, items);
     if (context.json) {
-        printJson(context.out, {{"identities", items}});
+        Json identities = Json::array();
+        for (const InventoryItem& item : items)
+            identities.push_back(identityJson(item, trust));
+        printJson(context.out, {{"identities", identities}});
         return ExitStatus::Done;
     }
     std::vector<std::vector<std::string>> rows = {{"ID", "VERSION", "TYPES", "WHERE"}};
+    if (!trust.empty()) rows.front().emplace_back("TRUST");
     for (const InventoryItem& item : items) {
         rows.push_back({item.id, item.version, joined(item.types, ","),
                         item.isInstallable() ? item.uri() : item.description});
+        if (const auto found = trust.find(item.uri()); found != trust.end())
+            rows.back().push_back(trustCell(found->second));
     }
     printTable(context.out, rows);
     return ExitStatus::Done;

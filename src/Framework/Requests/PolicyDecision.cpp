@@ -50,11 +50,14 @@ void requireAdministrator(const utils::Policy& policy, const Caller& caller) {
 
 }  // namespace
 
-PolicyDecision::PolicyDecision() : m_isOutermost(outermost == nullptr) {
-    if (!m_isOutermost) return;
-    m_policy = readPolicy();
-    if (m_policy != nullptr) requireAdministrator(*m_policy, CallerScope::current());
-    outermost = this;
+PolicyDecision::PolicyDecision(Aim aim) : m_isOutermost(outermost == nullptr), m_aim(aim) {
+    if (m_isOutermost) m_policy = readPolicy();
+    // A change inside a look was not asked for yet.
+    const bool isNew = m_isOutermost || outermost->m_aim == Aim::Look;
+    const utils::Policy* const judged = m_isOutermost ? m_policy.get() : outermost->m_policy.get();
+    if (isNew && aim == Aim::Change && judged != nullptr)
+        requireAdministrator(*judged, CallerScope::current());
+    if (m_isOutermost) outermost = this;
 }
 
 PolicyDecision::~PolicyDecision() {

@@ -21,9 +21,13 @@ inline constexpr std::string_view kBadPolicy = "nothing can be installed or dele
 /// machine refuses all, since nobody there says who calls.
 class QUENX_EXPORT PolicyDecision {
   public:
+    /// What is decided: to change something, which needs a caller who may, or to look whether it would go
+    /// well, which anybody may.
+    enum class Aim { Change, Look };
+
     /// @throws CimError (access denied) for a caller who may not, and where the policy cannot be obeyed; the
     /// text says why, and what would be right
-    PolicyDecision();
+    explicit PolicyDecision(Aim aim = Aim::Change);
     PolicyDecision(const PolicyDecision&) = delete;
     PolicyDecision& operator=(const PolicyDecision&) = delete;
     ~PolicyDecision();
@@ -34,6 +38,7 @@ class QUENX_EXPORT PolicyDecision {
 
   private:
     const bool m_isOutermost;
+    const Aim m_aim;
     std::shared_ptr<const utils::Policy> m_policy;  ///< null without a session
 };
 

@@ -67,6 +67,7 @@ struct ControlCall::Route {
 const ControlCall::Route ControlCall::kRoutes[] = {
     {control::kStatus, "GET", Privilege::Read, "Status", &ControlCall::showStatus},
     {control::kCheck, "POST", Privilege::Administer, "CheckImage", &ControlCall::checkImage},
+    {control::kTrust, "POST", Privilege::Administer, "JudgeImages", &ControlCall::judgeImages},
     {control::kRelease, "POST", Privilege::Administer, "ReleaseClaim", &ControlCall::releaseClaim},
     {control::kImages, "PUT", Privilege::Administer, "UploadImage", &ControlCall::storeImage}};
 
@@ -178,10 +179,27 @@ HttpAnswer ControlCall::checkImage() {
     const std::string uri = order.at("uri");
     const std::vector<std::uint16_t> options = order.at("options");
     const std::vector<std::string> values = order.at("values");
+    const core::NotedCall noted;
     const unsigned int value =
         serviceOf(*m_control.m_operations).checkImage(uri, core::CimPath(m_target), options, values);
     m_outcome = core::outcomeOf(core::MethodResult{value, {}}) + ", URI=" + uri;
-    return controlAnswer(200, {{"returnValue", value}});
+    Json answer = {{"returnValue", value}};
+    if (const std::string& key = noted.notes().signedBy; !key.empty()) answer["signedBy"] = key;
+    return controlAnswer(200, answer);
+}
+
+HttpAnswer ControlCall::judgeImages() {
+    Json images = Json::array();
+    update::ImageCheck& service = serviceOf(*m_control.m_operations);
+    for (const std::string uri : Json::parse(m_body).at("uris")) {
+        const update::ImageTrust trust = service.trustOf(uri);
+        images.push_back({{"uri", uri},
+                          {"asked", trust.isAsked},
+                          {"key", trust.key},
+                          {"reasonId", core::reasonCode(trust.reason)},
+                          {"why", trust.why}});
+    }
+    return controlAnswer(200, {{"images", images}});
 }
 
 HttpAnswer ControlCall::releaseClaim() {

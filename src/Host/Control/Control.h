@@ -66,6 +66,7 @@ class ControlCall {
     core::Caller asker() const;
     HttpAnswer showStatus();
     HttpAnswer checkImage();
+    HttpAnswer judgeImages();
     HttpAnswer releaseClaim();
     HttpAnswer storeImage();
     void beginUpload(const HttpHead& head);

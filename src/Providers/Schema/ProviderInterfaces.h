@@ -5,6 +5,7 @@
 #include <string>
 #include <vector>
 
+#include "Framework/Requests/Reasons.h"
 #include "Utils/Export.h"
 #include "Utils/FirmwareTypes.h"
 #include "Utils/StringArray.h"
@@ -85,6 +86,14 @@ struct Claim {
 /// What became of a claim that was to be given back.
 enum class ClaimRelease { Freed, NotHeld, AtWork };
 
+/// What the policy of the machine says of an image, whatever adapter it is for.
+struct ImageTrust {
+    bool isAsked = false;  ///< the policy wants images to be signed; false: nothing was looked at
+    std::string key = {};  ///< by which it is trusted; empty for one that is not
+    core::ReasonId reason = core::ReasonId::None;  ///< why it is not; None where nobody can tell
+    std::string why = {};                          ///< the same in words
+};
+
 /// Judges images without installing them, and tells which adapter the process holds, and for whom.
 class QUENX_EXPORT ImageCheck {
   public:
@@ -95,6 +104,10 @@ class QUENX_EXPORT ImageCheck {
     virtual unsigned int checkImage(const std::string& uri, const core::CimPath& target,
                                     const std::vector<std::uint16_t>& options,
                                     const std::vector<std::string>& values) = 0;
+    /// Whether the policy would let the image at a URI be installed; claims nothing. Reads the whole file
+    /// where the policy asks for signatures. Thread-safe. @throws core::CimError where the policy cannot be
+    /// obeyed
+    virtual ImageTrust trustOf(const std::string& uri) = 0;
     /// The adapter that is claimed in this process, by an update or by a check; empty for none. Thread-safe.
     virtual std::string claimedAdapter() const = 0;
     /// The same with who holds it, and for what. Thread-safe.

@@ -56,6 +56,7 @@ std::vector<std::string> foldersWithManifests(const utils::Policy& policy) {
 }
 
 std::optional<std::array<std::uint16_t, 4>> pciIdsOf(const std::string& adapterName) try {
+    if (adapterName.empty()) return std::nullopt;
     const ma::PciIds ids = ma::getAdapterInfo(adapterName).ids;
     if (ids.vendor == 0) return std::nullopt;
     return {{ids.vendor, ids.device, ids.subsystemVendor, ids.subsystemDevice}};

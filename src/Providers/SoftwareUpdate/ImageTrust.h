@@ -19,6 +19,7 @@ std::int64_t largestAllowedImage();
 [[noreturn]] void refuseTooLarge(const std::string& uri, std::int64_t size);
 
 /// Somebody whom the policy trusts has signed these bytes for such an adapter.
-/// @param path  of the file from which the bytes are
+/// @param path         of the file from which the bytes are
+/// @param adapterName  empty where only the signature matters
 void requireTrust(const std::string& uri, const std::string& path, std::span<const std::uint8_t> bytes,
                   const std::string& adapterName);

@@ -7,6 +7,7 @@
 #include <optional>
 #include <span>
 
+#include "Framework/Requests/PolicyDecision.h"
 #include "MidAPI/ma.h"
 #include "Providers/SoftwareUpdate/ImageTrust.h"
 #include "Providers/SoftwareUpdate/MethodResults.h"
@@ -265,6 +266,21 @@ PreparedImage readAndPrepare(const UpdateOrder& order, bool& isAskingAdapter) {
 PreparedImage examineImage(const UpdateOrder& order) {
     bool isAskingAdapter = false;
     return readAndPrepare(order, isAskingAdapter);
+}
+
+update::ImageTrust examineTrust(const std::string& uri) {
+    if (core::PolicyDecision::policy().trust == utils::TrustRule::Off) return {};
+    const core::NotedCall noted;
+    try {
+        ImageFile file(uri);
+        file.read();
+        const std::uint32_t size = file.measure();
+        const Buffer bytes = file.takeBytes();
+        requireTrust(uri, file.path(), {bytes.get(), size}, "");
+        return {.isAsked = true, .key = noted.notes().signedBy};
+    } catch (const utils::Exception& refusal) {
+        return {.isAsked = true, .reason = noted.notes().reason, .why = withoutNames(refusal.what())};
+    }
 }
 
 VerifiedImage verifyImage(const UpdateOrder& order) {

@@ -6,6 +6,7 @@
 #include <string>
 #include <vector>
 
+#include "Providers/Schema/ProviderInterfaces.h"
 #include "Providers/SoftwareUpdate/AdapterClaim.h"
 #include "Utils/FirmwareTypes.h"
 
@@ -39,6 +40,11 @@ std::vector<utils::FirmwareType> getTargetTypes(const std::vector<std::uint16_t>
 /// Throws the refusals of MethodResults.h, and what the adapter API throws.
 PreparedImage examineImage(const UpdateOrder& order);
 
-/// The same with the adapter claimed. A refusal gives the claim back before it leaves; any other failure
-/// keeps it, since the adapter is then in an unknown state, unless the configuration asks for its release.
+/// Reads the image that the URI names, and judges it by the policy alone. Nothing is read where that does not
+/// ask for signatures.
+update::ImageTrust examineTrust(const std::string& uri);
+
+/// The same as examineImage() with the adapter claimed. A refusal gives the claim back before it leaves; any
+/// other failure keeps it, since the adapter is then in an unknown state, unless the configuration asks for
+/// its release.
 VerifiedImage verifyImage(const UpdateOrder& order);

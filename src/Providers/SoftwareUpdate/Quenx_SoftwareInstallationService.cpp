@@ -195,6 +195,7 @@ unsigned int Quenx_SoftwareInstallationService::checkImage(const std::string& ur
                                                            const std::vector<std::string>& values) {
     const utils::TimeStamp timing("Quenx_SoftwareInstallationService::checkImage");
     const core::RequestScope scope;  // for callers that come without the request layer
+    const core::PolicyDecision decision(core::PolicyDecision::Aim::Look);
     if (!areOptionsAccepted(options)) {
         core::NotedCall::noteReason(Id::OptionsNotSupported);
         return MethodReturn::InvalidParameter;
@@ -202,6 +203,11 @@ unsigned int Quenx_SoftwareInstallationService::checkImage(const std::string& ur
     UpdateOrder order{{}, uri, options, values};
     if (const auto refused = resolve(kChecking, nullptr, target, order)) return *refused;
     return returnValueOf(kChecking, resultOfExamining(order), target.toString());
+}
+
+update::ImageTrust Quenx_SoftwareInstallationService::trustOf(const std::string& uri) {
+    const core::PolicyDecision decision(core::PolicyDecision::Aim::Look);
+    return examineTrust(uri);
 }
 
 std::string Quenx_SoftwareInstallationService::claimedAdapter() const {

@@ -33,6 +33,7 @@ class Quenx_SoftwareInstallationService : public CIM_SoftwareInstallationService
     unsigned int checkImage(const std::string& uri, const core::CimPath& target,
                             const std::vector<std::uint16_t>& options,
                             const std::vector<std::string>& values) override;
+    update::ImageTrust trustOf(const std::string& uri) override;
     std::string claimedAdapter() const override;
     update::Claim claim() const override;
     update::ClaimRelease releaseClaim(const std::string& adapter) override;

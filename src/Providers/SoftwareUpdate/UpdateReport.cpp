@@ -15,16 +15,6 @@ namespace {
 /// The call that this thread carries out; null without a sink.
 thread_local UpdateReport* current = nullptr;
 
-/// Without "SMASHv2:EInvalidUri:", which is for those who search the log.
-std::string withoutNames(std::string_view text) {
-    if (!text.starts_with("SMASHv2:")) return std::string(text);
-    text.remove_prefix(text.find(':') + 1);
-    const std::string_view name = text.substr(0, text.find(':'));
-    if (name.size() < text.size() && name.starts_with('E') && name.find(' ') == std::string_view::npos)
-        text.remove_prefix(name.size() + 1);
-    return std::string(text);
-}
-
 /// For what nobody on the way has given words.
 std::string_view textOf(core::ReasonId id) {
     const core::Reason* reason = core::findReason(id);
@@ -47,6 +37,15 @@ void refuseWithout(const std::string& problem) {
 }
 
 }  // namespace
+
+std::string withoutNames(std::string_view text) {
+    if (!text.starts_with("SMASHv2:")) return std::string(text);
+    text.remove_prefix(text.find(':') + 1);
+    const std::string_view name = text.substr(0, text.find(':'));
+    if (name.size() < text.size() && name.starts_with('E') && name.find(' ') == std::string_view::npos)
+        text.remove_prefix(name.size() + 1);
+    return std::string(text);
+}
 
 UpdateReport::UpdateReport() : m_sink(wantedSink()) {
     if (m_sink == nullptr) return;

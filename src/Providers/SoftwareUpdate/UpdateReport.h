@@ -16,6 +16,9 @@
 
 class Quenx_ConcreteJob;
 
+/// A message of utils::Exception without "SMASHv2:EInvalidUri:", which is for those who search the log.
+std::string withoutNames(std::string_view text);
+
 /// What the front's sink is told of one call that installs: collected on the call's thread, and told when the
 /// update begins or the call is answered. Without a sink nothing is collected.
 class UpdateReport {
