@@ -191,7 +191,8 @@ HttpAnswer ControlCall::checkImage() {
 HttpAnswer ControlCall::judgeImages() {
     Json images = Json::array();
     update::ImageCheck& service = serviceOf(*m_control.m_operations);
-    for (const std::string uri : Json::parse(m_body).at("uris")) {
+    const std::vector<std::string> uris = Json::parse(m_body).at("uris");
+    for (const std::string& uri : uris) {
         const update::ImageTrust trust = service.trustOf(uri);
         images.push_back({{"uri", uri},
                           {"asked", trust.isAsked},
