@@ -51,7 +51,7 @@ INSTANTIATE_TEST_SUITE_P(Shell, SessionTest,
                          ::testing::Values("Ansible", "BadFiles", "CommandLine", "ConfigCheck", "Daemon",
                                            "Domains", "Help", "History", "Identities", "ImagePolicy",
                                            "Install", "Json", "Many", "Policy", "Registration", "Rollback",
-                                           "Settings", "Staged", "UsersFile", "WrongImages"),
+                                           "Settings", "Staged", "Trust", "UsersFile", "WrongImages"),
                          [](const auto& session) { return session.param; });
 
 }  // namespace

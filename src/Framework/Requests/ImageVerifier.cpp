@@ -22,11 +22,11 @@ ImageVerifier* ImageVerifier::installed() noexcept {
     return installedVerifier.load(std::memory_order_acquire);
 }
 
-LoadedVerifier::LoadedVerifier() {
-    installedVerifier.store(this, std::memory_order_release);
+InstalledVerifier::InstalledVerifier(ImageVerifier& verifier) {
+    installedVerifier.store(&verifier, std::memory_order_release);
 }
 
-LoadedVerifier::~LoadedVerifier() {
+InstalledVerifier::~InstalledVerifier() {
     installedVerifier.store(nullptr, std::memory_order_release);
 }
 

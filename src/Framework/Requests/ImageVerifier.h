@@ -53,13 +53,19 @@ class QUENX_EXPORT ImageVerifier {
     static ImageVerifier* installed() noexcept;
 };
 
+/// Makes a verifier the one of this process, as long as this lives.
+class QUENX_EXPORT InstalledVerifier {
+  public:
+    explicit InstalledVerifier(ImageVerifier& verifier);
+    ~InstalledVerifier();
+    InstalledVerifier(const InstalledVerifier&) = delete;
+    InstalledVerifier& operator=(const InstalledVerifier&) = delete;
+};
+
 /// The verifier of the library for it, trust/libQuenx_Trust.so beside the framework's own, which is loaded
-/// when a signature is first asked for. The one of its process as long as it lives.
+/// when a signature is first asked for.
 class QUENX_EXPORT LoadedVerifier : public ImageVerifier {
   public:
-    LoadedVerifier();
-    ~LoadedVerifier() override;
-
     TrustVerdict verify(const ImageToVerify& image) noexcept override;
     /// Loads the library now, so that nothing has to be loaded later. Without it nothing can be verified:
     /// verify() says so.

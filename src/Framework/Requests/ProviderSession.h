@@ -115,6 +115,7 @@ class QUENX_EXPORT ProviderSession {
     utils::PolicyFile m_policy;
     os::OSLockerLinux m_locker;
     LoadedVerifier m_verifier;
+    const InstalledVerifier m_installedVerifier{m_verifier};
     std::optional<InstalledSink> m_history;
     ProviderLibraries m_libraries;
     std::shared_ptr<void> m_agent;
