@@ -34,8 +34,10 @@ inline constexpr const char* kTrust = "/quenx/v1/trust";
 inline constexpr const char* kRelease = "/quenx/v1/release";
 
 /// PUT of a file, at this + SHA-256 of the image + "/" + NAME: {"uri": TEXT}. What belongs to an image, such
-/// as its signature, goes to the same place under a name of its own.
+/// as its signature, goes to the same place, with one of the ends below.
 inline constexpr std::string_view kImages = "/quenx/v1/images/";
+/// The ends of the names of what may belong to an image: its signature, its manifest and the signature of that.
+inline constexpr std::string_view kCompanions[] = {".p7s", ".manifest.toml", ".manifest.p7s"};
 /// The SHA-256 of the file that is sent, in hexadecimal digits.
 inline constexpr const char* kSumHeader = "Quenx-SHA256";
 

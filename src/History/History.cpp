@@ -28,7 +28,7 @@ constexpr std::chrono::minutes kReadingPatience{1};
 /// What clients send may be as long as a request, and a history has room for many.
 std::string cut(const std::string& text) {
     constexpr std::size_t kMost = 2000;
-    return text.substr(0, kMost);
+    return utils::shortened(text, kMost);
 }
 
 std::string joinedNumbers(const std::vector<std::uint16_t>& numbers) {

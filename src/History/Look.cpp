@@ -65,7 +65,7 @@ std::optional<AdapterLook> lookAt(const std::string& adapter) try {
                std::to_string(component.version));
     look.stored = look.running;
     return look;
-} catch (const utils::Exception&) {
+} catch (const std::exception&) {
     return std::nullopt;
 }
 

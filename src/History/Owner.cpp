@@ -21,11 +21,20 @@ std::string systemText(const char* path) {
     return text.substr(0, text.find('\n'));
 }
 
+/// "3d890cfe-9d5a-4a15-...", where the service manager leaves out the dashes.
+std::string asTheKernelWritesIt(std::string id) {
+    constexpr std::size_t kDigits = 32;
+    if (id.size() != kDigits) return id;
+    for (const std::size_t place : {20U, 16U, 12U, 8U})
+        id.insert(place, "-");
+    return id;
+}
+
 /// A service that sees only processes of /proc is told the boot's id by its manager.
 std::string bootId() {
     const std::string id = systemText("/proc/sys/kernel/random/boot_id");
     const char* told = os::getEnvVariable("QUENX_BOOT_ID");
-    return id.empty() && told != nullptr ? told : id;
+    return id.empty() && told != nullptr ? asTheKernelWritesIt(told) : id;
 }
 
 /// The 22nd field of the line; the second one, the name, may hold blanks and parentheses.

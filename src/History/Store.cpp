@@ -201,10 +201,13 @@ void Store::update(const Record& record) {
     std::string sql = "UPDATE updates SET ";
     for (int i = 0; i < kColumnCount; ++i)
         sql += (i == 0 ? "" : ", ") + std::string(kColumns[i].name) + " = ?" + std::to_string(i + 1);
-    Statement statement(m_database,
-                        sql + " WHERE outcome = 'running' AND id = ?" + std::to_string(kColumnCount + 1));
+    Statement statement(m_database, sql + " WHERE outcome IN ('running', 'interrupted') AND id = ?" +
+                                        std::to_string(kColumnCount + 1) + " AND owner = ?" +
+                                        std::to_string(kColumnCount + 2));
     bindColumns(statement, record);
+    // Whoever took this process for dead was wrong: it knows best how its update has ended.
     statement.bind(kColumnCount + 1, record.id);
+    statement.bind(kColumnCount + 2, record.owner);
     statement.step();
 }
 

@@ -46,7 +46,7 @@ class Store {
     /// Adds the record, and gives it its id.
     /// @param most  how many records are kept
     Pruned add(Record& record, std::int64_t most);
-    /// Puts what is known now in the place of a record, unless it is no longer that of a running update.
+    /// Puts what is known now in the place of a record of the same owner, unless its update has ended.
     void update(const Record& record);
     /// Whether the record of a running update is in this file.
     bool holds(const Record& record);

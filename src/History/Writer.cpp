@@ -7,6 +7,7 @@
 #include <mutex>
 #include <thread>
 
+#include "Utils/Log.h"
 #include "Utils/Os/Linux/SignalsBlocked.h"
 
 namespace history {
@@ -59,6 +60,19 @@ bool Writer::run(Task task, std::chrono::milliseconds patience) {
     return isDone;
 }
 
+namespace {
+
+/// What comes out of a task, as when memory ends, must not end the process, which may write a flash now: its
+/// record is what is lost.
+bool guarded(const std::function<bool()>& step) noexcept try {
+    return step();
+} catch (const std::exception& error) {
+    QUENX_ERROR("[history] A step was given up: %s", error.what());
+    return true;
+}
+
+}  // namespace
+
 void Writer::work(const std::shared_ptr<State>& state) {
     bool isWatching = false;
     Clock::time_point next = Clock::now();
@@ -69,7 +83,7 @@ void Writer::work(const std::shared_ptr<State>& state) {
             state->changed.wait(lock, hasWork);
         } else if (!state->changed.wait_until(lock, next, hasWork)) {
             lock.unlock();
-            isWatching = state->perSecond();
+            isWatching = guarded(state->perSecond);
             next = Clock::now() + kSecond;
             lock.lock();
             continue;
@@ -78,7 +92,10 @@ void Writer::work(const std::shared_ptr<State>& state) {
         const Task task = std::move(state->tasks.front());
         state->tasks.pop_front();
         lock.unlock();
-        task();
+        guarded([&] {
+            task();
+            return true;
+        });
         if (!isWatching) next = Clock::now() + kSecond;
         isWatching = true;
         lock.lock();

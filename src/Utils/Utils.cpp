@@ -75,6 +75,13 @@ std::string lowerCase(std::string_view text) {
     return folded;
 }
 
+std::string shortened(std::string_view text, std::size_t most) {
+    std::size_t shown = std::min(text.size(), most);
+    while (shown > 0 && shown < text.size() && (text[shown] & 0xC0) == 0x80)
+        --shown;
+    return std::string(text.substr(0, shown));
+}
+
 std::string joined(const StringArray& texts, std::string_view separator) {
     std::string result;
     for (const std::string& text : texts) {

@@ -75,6 +75,10 @@ constexpr bool isControl(char c) {
 /// The texts in one, with the separator between them.
 QUENX_EXPORT std::string joined(const StringArray& texts, std::string_view separator = ", ");
 
+/// The beginning of a text, of at most so many bytes, and never with half a character of UTF-8 at its end,
+/// which would make unreadable what it goes into.
+QUENX_EXPORT std::string shortened(std::string_view text, std::size_t most);
+
 /// The byte as two hexadecimal digits in lower case.
 QUENX_EXPORT std::string hexByte(unsigned char byte);
 

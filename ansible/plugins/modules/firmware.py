@@ -19,7 +19,7 @@ author:
   - The Quenx authors (@quenx)
 options:
   images:
-    description: The images, as paths on the machine with the adapters.
+    description: The images, as paths on the machine on which the task runs.
     type: list
     elements: str
     required: true
@@ -34,7 +34,7 @@ options:
     type: bool
     default: true
   force:
-    description: Also install what is older, the same again, or of which it cannot be told.
+    description: Also install what is older, the same again, or cannot be compared.
     type: bool
     default: false
   keep_going:
@@ -52,7 +52,7 @@ options:
   server:
     description:
       - The URL of an object manager to use, C(https://host:5989), instead of the machine that the task runs on; delegate
-        the task to a machine that can reach it. Images are files of that host.
+        the task to a machine that can reach it. The images are sent to it first.
     type: str
   user:
     description: The user on the server.
@@ -145,6 +145,11 @@ not_tried:
   returned: always
   type: list
   elements: str
+unused:
+  description: Images that are for no adapter here. The task fails when none of them is for any.
+  returned: always
+  type: list
+  elements: str
 """
 
 import json
@@ -177,6 +182,9 @@ def command_of(params, check_mode):
         if params[name]:
             command += [option, params[name]]
     command += [option for name, option in FLAGS.items() if params[name]]
+    # A path on the server would be one of which nothing can be told from here.
+    if params["server"]:
+        command.append("--upload")
     if not params["fit"] and not params["match"]:
         command.append("--all")
     if check_mode:
@@ -218,6 +226,7 @@ def results_of(document):
         "reboot_required": any(result["resetPending"] for result in document["results"]),
         "same_card": [function["adapter"] for function in document["sameCard"]],
         "not_tried": document["notTried"],
+        "unused": document["unused"],
         "diff": {"before": text_of(adapters, "before"), "after": text_of(adapters, "after")},
     }
 
@@ -235,11 +244,14 @@ def main():
         module.fail_json(msg="quenxctl ended with status %d and no result, so what it did is unknown." % status,
                          stdout=output, stderr=errors)
     if "error" in document:
-        module.fail_json(msg=" ".join((document["error"], document["advice"])).strip(), rc=status)
+        module.fail_json(msg=" ".join((document["error"], document["advice"])).strip(), rc=status,
+                         reason_id=document.get("reasonId"))
     results = results_of(document)
     failed = [each["name"] + ": " + each["message"] for each in results["adapters"] if each["outcome"] in FAILURES]
     if failed or results["not_tried"]:
         module.fail_json(msg="\n".join(failed or ["Interrupted."]), **results)
+    if results["unused"] and not results["adapters"]:
+        module.fail_json(msg="No adapter takes " + ", ".join(results["unused"]) + ".", **results)
     module.exit_json(**results)
 
 

@@ -23,9 +23,6 @@ namespace {
 
 using nlohmann::json;
 
-/// What may lie beside an image and is for its verification: signatures and manifests.
-constexpr const char* kCompanions[] = {".p7s", ".manifest.toml", ".manifest.p7s"};
-
 [[noreturn]] void refuseAnswer() {
     throw NoAnswer(ExitStatus::Failed, "The server's answer cannot be read.",
                    "Check that --server names quenx-cimd of this version.");
@@ -184,8 +181,10 @@ std::optional<std::string> ServerControl::upload(const std::string& file) {
     if (!uri) return std::nullopt;
     // Its folder there is named after the image, and so are those of what belongs to it.
     const std::string image = std::filesystem::path(*uri).parent_path().filename().string();
-    for (const char* ending : kCompanions)
-        if (std::filesystem::exists(file + ending)) sendFile(file + ending, image);
+    for (const std::string_view ending : control::kCompanions) {
+        const std::string companion = file + std::string(ending);
+        if (std::filesystem::exists(companion)) sendFile(companion, image);
+    }
     return uri;
 }
 

@@ -31,6 +31,10 @@ void printJson(std::ostream& out, const Json& document) {
     out << document.dump(2, ' ', true, Json::error_handler_t::replace) << '\n';
 }
 
+std::string jsonLine(const Json& document) {
+    return document.dump(-1, ' ', true, Json::error_handler_t::replace);
+}
+
 void printTable(std::ostream& out, const std::vector<std::vector<std::string>>& rows) {
     // A longer cell does not widen its column: it would take as many spaces in each of the other rows.
     constexpr std::size_t kWidest = 200;

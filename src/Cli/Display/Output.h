@@ -18,6 +18,9 @@ using Json = nlohmann::ordered_json;
 /// replaced: JSON has no place for them.
 void printJson(std::ostream& out, const Json& document);
 
+/// The same on a line, without its end.
+std::string jsonLine(const Json& document);
+
 /// Prints rows with each column as wide as its widest cell; control characters in cells are made visible.
 void printTable(std::ostream& out, const std::vector<std::vector<std::string>>& rows);
 

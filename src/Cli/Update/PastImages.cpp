@@ -27,6 +27,18 @@ bool isOfThisCard(const Record& record, const history::AdapterLook& look) {
     return record.serial == look.serial;
 }
 
+/// A failure that was noticed in time.
+bool hasChangedNothing(const Record& record) {
+    return !record.versionsAfter.empty() && record.versionsAfter == record.versionsBefore;
+}
+
+/// Whether the later update found what the earlier one had left: not where another one wrote some types in
+/// between. What nobody has seen run says nothing of it, since the later one names what ran.
+bool isBefore(const Record& earlier, const Record& later) {
+    const bool isTelling = earlier.active && !earlier.versionsAfter.empty() && !later.versionsBefore.empty();
+    return !isTelling || earlier.versionsAfter == later.versionsBefore;
+}
+
 }  // namespace
 
 PastImages pastImagesOf(const Connection& connection, const Adapter& adapter) {
@@ -40,12 +52,12 @@ PastImages pastImagesOf(const Connection& connection, const Adapter& adapter) {
     for (const Record& record : records) {
         if (!isOfThisCard(record, *look) || record.outcome == history::kRefused) continue;
         const bool isWritten = record.outcome == history::kWritten;
-        if (!past.last && !isWritten) isUnchanged = false;
+        if (!past.last && !isWritten && !hasChangedNothing(record)) isUnchanged = false;
         if (!isWritten || record.sha256.empty()) continue;
         if (!past.last) {
             past.last = record;
         } else if (record.sha256 != past.last->sha256) {
-            past.before = record;
+            if (isBefore(record, *past.last)) past.before = record;
             break;
         }
     }

@@ -83,7 +83,7 @@ Reason explainHiddenHolder(std::uint32_t returnValue, const Candidate& candidate
 
 /// In the words of the service, where it is known what they were.
 Reason explainTold(const Connection& connection, std::uint32_t returnValue, const Candidate& candidate) {
-    const std::string reason = toldReason(connection, candidate.adapter.name, returnValue);
+    const std::string reason = toldReason(connection, candidate.adapter.name, candidate.uri, returnValue);
     if (reason.empty()) return std::nullopt;
     // It may have met anything.
     const bool isVague = returnValue == MethodReturn::UnspecifiedError;
@@ -290,7 +290,7 @@ Reason explainTrust(const Connection& connection, std::uint32_t returnValue, con
     const core::Reason* row = core::findReason(id);
     const auto number = static_cast<unsigned>(id);
     if (row == nullptr || number < kFirstOfTrust || number > kLastOfTrust) return std::nullopt;
-    const std::string told = toldReason(connection, candidate.adapter.name, returnValue);
+    const std::string told = toldReason(connection, candidate.adapter.name, candidate.uri, returnValue);
     return Explanation{told.empty() ? row->text : sentence(told), row->advice};
 }
 

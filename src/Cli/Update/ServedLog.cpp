@@ -71,12 +71,13 @@ std::vector<Record> readHistory(const Connection& connection, const history::Fil
                        "Put \"history_served = true\" into the policy of its machine, and restart it.");
 }
 
-std::string toldReason(const Connection& connection, const std::string& adapter, std::uint32_t returnValue) {
+std::string toldReason(const Connection& connection, const std::string& adapter, const std::string& uri,
+                       std::uint32_t returnValue) {
     if (connection.isInProcess) return connection.refusals ? connection.refusals->lastReason() : "";
     try {
         for (const Record& record : readServed(*connection.operations, {.adapter = adapter}))
             if (record.outcome == history::kRefused)
-                return record.returnValue == returnValue ? record.reason : "";
+                return record.uri == uri && record.returnValue == returnValue ? record.reason : "";
     } catch (const core::CimError&) {
         // What explains an answer must not stand in its way.
     } catch (const CommandError&) {

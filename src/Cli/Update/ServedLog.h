@@ -14,8 +14,9 @@ namespace cli {
 /// thousand that a server serves. Throws CommandError where there is no history to be read.
 std::vector<history::Record> readHistory(const Connection& connection, const history::Filter& filter);
 
-/// Why the service has just answered an attempt on the adapter with this value, in its words; empty where
-/// nobody tells.
-std::string toldReason(const Connection& connection, const std::string& adapter, std::uint32_t returnValue);
+/// Why the service has just answered an attempt to install this on the adapter with this value, in its words;
+/// empty where nobody tells.
+std::string toldReason(const Connection& connection, const std::string& adapter, const std::string& uri,
+                       std::uint32_t returnValue);
 
 }  // namespace cli

@@ -14,7 +14,11 @@ bool matches(const Adapter& adapter, const std::string& pattern) {
     const auto isLike = [&](const std::string& text) {
         return !text.empty() && ::fnmatch(pattern.c_str(), text.c_str(), 0) == 0;
     };
-    return pattern.empty() || isLike(adapter.name) || isLike(adapter.pciAddress);
+    // The domain 0 is not shown, and may be named all the same.
+    const std::string& address = adapter.pciAddress;
+    const bool isWithoutDomain = address.size() == std::string_view("03:00.0").size();
+    return pattern.empty() || isLike(adapter.name) || isLike(address) ||
+           (isWithoutDomain && isLike("0000:" + address));
 }
 
 /// The options for each image, one after the other.

@@ -37,10 +37,13 @@ std::int64_t timeOf(const std::string& text) {
         time.tm_isdst = -1;  // as the zone has it at that time
         const char* rest = ::strptime(plain.c_str(), format, &time);
         if (rest == nullptr) continue;
+        const int day = time.tm_mday;
+        // There is no 31st of February, which the library would take for one of March.
+        if (std::tm copy = time; ::timegm(&copy) == -1 || copy.tm_mday != day) break;
         if (*rest == '\0') return std::int64_t{::mktime(&time)} * kSecond;
         if (const auto zone = zoneOf(rest)) return (std::int64_t{::timegm(&time)} - *zone * 60) * kSecond;
     }
-    throw CommandError(ExitStatus::WrongUse, "--since is \"" + text + "\", which is no time.",
+    throw CommandError(ExitStatus::WrongUse, "--since is \"" + text + "\", which is not a time.",
                        "Write it as 2026-11-22 or 2026-11-22T16:00, with Z or +01:00 for a zone.");
 }
 
@@ -55,7 +58,7 @@ history::Filter filterOf(const HistoryOptions& options) {
     if (options.after.empty()) return filter;
     filter.after = utils::parseNumber<std::int64_t>(options.after);
     if (!filter.after)
-        throw CommandError(ExitStatus::WrongUse, "--after is \"" + options.after + "\", which is no id.",
+        throw CommandError(ExitStatus::WrongUse, "--after is \"" + options.after + "\", which is not an id.",
                            "Give it the id of a record, a whole number.");
     return filter;
 }
@@ -91,7 +94,7 @@ ExitStatus showHistory(Context& context, const VerbOptions& options) {
     const std::vector<Record> records = readHistory(context.connection, filterOf(options.history));
     if (options.history.asLines) {
         for (const Record& record : records)
-            context.out << Json(record).dump() << '\n';
+            context.out << jsonLine(record) << '\n';
     } else if (context.json) {
         Json list = Json::array();
         for (const Record& record : records)

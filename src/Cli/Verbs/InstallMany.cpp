@@ -29,12 +29,20 @@ std::vector<Component> versionsAfter(const Candidate& candidate) {
     return components;
 }
 
+/// What the service says; nothing where it cannot be asked, as by somebody on a server who may only read.
+std::optional<std::uint32_t> askService(const Connection& connection, const Candidate& candidate) try {
+    return verifyOnly(connection, candidate);
+} catch (const core::CimError& error) {
+    if (connection.isInProcess || error.status() != core::CimStatus::AccessDenied) throw;
+    return std::nullopt;
+}
+
 /// What would become of a candidate that is to be written.
 Outcome judge(const Connection& connection, const Candidate& candidate) {
     Outcome outcome(candidate);
     const core::NotedCall noted;
     // A file that would be sent is not where the server could look at it.
-    if (candidate.localFile.empty()) outcome.returnValue = verifyOnly(connection, candidate);
+    if (candidate.localFile.empty()) outcome.returnValue = askService(connection, candidate);
     outcome.reason = noted.notes().reason;
     outcome.signedBy = noted.notes().signedBy;
     if (outcome.returnValue.value_or(MethodReturn::Completed) != MethodReturn::Completed) {
@@ -64,8 +72,8 @@ std::optional<Outcome> settle(const Connection& connection, const Candidate& can
         return std::nullopt;
     else
         outcome.end(Ending::Unknown,
-                    {"Whether " + outcome.label + " has " + candidate.uri + " already" +
-                         (mayBeForOther ? ", or can have it" : "") + ", cannot be told: it was not written.",
+                    {"Nothing was written to " + outcome.label + ": quenxctl cannot tell whether " +
+                         candidate.uri + (mayBeForOther ? " is for it, or" : " is") + " there already.",
                      "Use --force to write it.", ExitStatus::Unknown});
     return outcome;
 }

@@ -33,6 +33,8 @@ ExitStatus ManyResults::status() const {
     if (isInterrupted || has(ExitStatus::Interrupted)) return ExitStatus::Interrupted;
     if (has(ExitStatus::Unknown)) return ExitStatus::Unknown;
     if (std::ranges::any_of(outcomes, &Outcome::isFailure)) return ExitStatus::Failed;
+    // Images that are for no adapter here are a mistake, as a rule.
+    if (outcomes.empty() && !unused.empty()) return ExitStatus::NotFound;
     return has(ExitStatus::Done) ? ExitStatus::Done : ExitStatus::AlreadyCurrent;
 }
 

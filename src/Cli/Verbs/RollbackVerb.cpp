@@ -6,12 +6,15 @@
 #include "Cli/Verbs/Outcome.h"
 #include "Framework/Requests/PolicyDecision.h"
 #include "History/KeptImages.h"
+#include "Utils/Utils.h"
 
 namespace cli {
 
 namespace {
 
 using history::Record;
+
+constexpr char kTypeSeparator = '+';  // in the records
 
 /// "IMG_PXE 1, IMG_UEFI 0 (SHA-256 9f86...)"
 std::string imageText(const Record& record) {
@@ -77,6 +80,11 @@ ExitStatus rollback(Context& context, const VerbOptions& options) try {
     UpdateOptions update;
     update.target = adapter.name;
     update.image = fileOf(*connection.operations, image);
+    // No more than was written of it then.
+    if (!image.optionValues.empty()) {
+        for (const std::string& type : utils::split(image.optionValues, kTypeSeparator))
+            update.types.push_back(type);
+    }
     // It is older than what is there, as a rule.
     update.force = true;
     if (!context.json)

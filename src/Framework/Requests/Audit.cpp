@@ -5,6 +5,7 @@
 #include <string_view>
 
 #include "Utils/Log.h"
+#include "Utils/Utils.h"
 
 namespace core {
 
@@ -52,12 +53,7 @@ std::string outcomeOf(CimStatus status, const std::string& description) {
 
 std::string shownText(const std::exception& error) {
     constexpr std::size_t kMost = 2000;
-    const std::string_view whole = error.what();
-    std::size_t shown = std::min(whole.size(), kMost);
-    // Never half a character, which would make the answer unreadable.
-    while (shown > 0 && shown < whole.size() && (whole[shown] & 0xC0) == 0x80)
-        --shown;
-    return std::string(whole.substr(0, shown));
+    return utils::shortened(error.what(), kMost);
 }
 
 std::string auditLine(const AuditEvent& event, const std::vector<Argument>& arguments) {

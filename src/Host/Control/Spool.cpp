@@ -56,6 +56,15 @@ void requirePlace(const std::string& place) {
                                       "and ._+-@,~ that do not begin with a dot or a dash, and no slash");
 }
 
+std::string imageOf(const std::string& place) {
+    return place.substr(0, control::Sha256::kDigits);
+}
+
+bool isCompanion(const std::string& place) {
+    return std::ranges::any_of(control::kCompanions,
+                               [&](std::string_view ending) { return place.ends_with(ending); });
+}
+
 /// An image with what belongs to it.
 struct Stored {
     fs::path folder;
@@ -102,19 +111,33 @@ Spool::Spool(const UploadSettings& settings) : m_settings(placed(settings)) {
 }
 
 void Spool::reserve(std::uint64_t size, const std::string& place) {
-    const std::string image = place.substr(0, control::Sha256::kDigits);
-    const std::vector<Stored> stored = storedIn(m_settings.directory);
-    std::uint64_t used = m_reserved + size;
-    std::error_code isNew;
+    std::uint64_t needed = m_reserved + size;
+    for (const Stored& each : storedIn(m_settings.directory))
+        if (each.folder.filename() == imageOf(place)) needed += each.bytes;
+    if (needed > m_settings.totalBytes + replacedBy(size, place))
+        throw ControlRefusal(507, "other uploads that are under way need the room: uploads.total_bytes is " +
+                                      std::to_string(m_settings.totalBytes) +
+                                      "; try again when they are done");
+    m_reserved += size;
+}
+
+std::uint64_t Spool::replacedBy(std::uint64_t size, const std::string& place) const {
     // The same file once more takes the place of the one that is there.
+    std::error_code isNew;
     const std::uintmax_t replaced = fs::file_size(m_settings.directory + "/" + place, isNew);
-    if (!isNew) used -= std::min<std::uintmax_t>(replaced, size);
+    return isNew ? 0 : std::min<std::uintmax_t>(replaced, size);
+}
+
+void Spool::makeRoom(std::uint64_t size, const std::string& place) {
+    const std::vector<Stored> stored = storedIn(m_settings.directory);
+    std::uint64_t used = m_reserved;
     for (const Stored& each : stored)
         used += each.bytes;
+    used -= replacedBy(size, place);
     std::size_t count = stored.size();
     for (const Stored& oldest : stored) {
         if (used <= m_settings.totalBytes && count < kMostImages) break;
-        if (oldest.folder.filename() == image) continue;
+        if (oldest.folder.filename() == imageOf(place)) continue;
         std::error_code error;
         fs::remove_all(oldest.folder, error);
         if (error) continue;
@@ -123,11 +146,6 @@ void Spool::reserve(std::uint64_t size, const std::string& place) {
         used -= oldest.bytes;
         --count;
     }
-    if (used > m_settings.totalBytes)
-        throw ControlRefusal(507, "uploads under way take all of the " +
-                                      std::to_string(m_settings.totalBytes) +
-                                      " bytes of uploads.total_bytes; try again when they are done");
-    m_reserved += size;
 }
 
 void Spool::giveBack(std::uint64_t size) {
@@ -143,6 +161,10 @@ std::unique_ptr<Upload> Spool::begin(const std::string& place, std::uint64_t siz
     if (!control::isSha256(sum))
         throw ControlRefusal(400, std::string("the header ") + control::kSumHeader +
                                       " has to hold the SHA-256 of the file, 64 lower-case digits");
+    // Else somebody could have another image installed than the one that its URI names.
+    if (sum != imageOf(place) && !isCompanion(place))
+        throw ControlRefusal(
+            400, "an image is sent to the SHA-256 of its bytes, which is not the one in the path");
     if (size == 0) throw ControlRefusal(400, "the file is empty; send a complete image");
     if (size > m_settings.imageBytes)
         throw ControlRefusal(413, "the file has " + std::to_string(size) + " bytes, more than the " +
@@ -156,12 +178,17 @@ std::unique_ptr<Upload> Spool::begin(const std::string& place, std::uint64_t siz
         const utils::Mutex::AutoLocker lock(m_mutex);
         reserve(size, place);
     }
+    std::unique_ptr<Upload> upload;
     try {
-        return std::make_unique<Upload>(*this, place, size, sum);
+        upload = std::make_unique<Upload>(*this, place, size, sum);
     } catch (...) {
         giveBack(size);
         throw;
     }
+    // Not before the disk has taken this one: nothing goes for a file that is refused.
+    const utils::Mutex::AutoLocker lock(m_mutex);
+    makeRoom(size, place);
+    return upload;
 }
 
 namespace {

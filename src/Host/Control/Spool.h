@@ -41,8 +41,11 @@ class Spool {
   private:
     friend class Upload;
 
-    /// The folder of the place stays, whatever has to go.
+    /// @throws ControlRefusal  where there would be no room for the file, whatever went
     void reserve(std::uint64_t size, const std::string& place) QUENX_REQUIRES(m_mutex);
+    /// Removes the oldest images until all that is reserved has room. The folder of the place stays.
+    void makeRoom(std::uint64_t size, const std::string& place) QUENX_REQUIRES(m_mutex);
+    std::uint64_t replacedBy(std::uint64_t size, const std::string& place) const;
     void giveBack(std::uint64_t size);
 
     const UploadSettings m_settings;
