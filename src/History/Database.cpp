@@ -3,12 +3,15 @@
 
 #include <sqlite3.h>
 
+#include <utility>
+
 namespace history {
 
 namespace {
 
 constexpr int kBusyTimeout = 30'000;  // ms that other writers are waited for
 constexpr int kPrimaryCode = 0xFF;
+constexpr std::size_t kMostIdle = 16;  // more texts than a front that keeps records uses
 
 void require(int code, sqlite3* database) {
     if (code == SQLITE_OK) return;
@@ -59,15 +62,31 @@ int Database::changes() const {
     return sqlite3_changes(m_database.get());
 }
 
-void Statement::Finalize::operator()(sqlite3_stmt* statement) const {
+void Database::Finalize::operator()(sqlite3_stmt* statement) const {
     sqlite3_finalize(statement);
 }
 
-Statement::Statement(Database& database, const std::string& sql) : m_database(database) {
+Database::Prepared Database::take(const std::string& sql) {
+    if (auto idle = m_idle.extract(sql)) return std::move(idle.mapped());
     sqlite3_stmt* prepared = nullptr;
-    require(sqlite3_prepare_v2(database.m_database.get(), sql.c_str(), -1, &prepared, nullptr),
-            database.m_database.get());
-    m_statement.reset(prepared);
+    require(sqlite3_prepare_v2(m_database.get(), sql.c_str(), -1, &prepared, nullptr), m_database.get());
+    return Prepared(prepared);
+}
+
+void Database::giveBack(const std::string& sql, Prepared statement) noexcept try {
+    // One that has failed is not used again.
+    if (m_idle.size() >= kMostIdle || sqlite3_reset(statement.get()) != SQLITE_OK) return;
+    sqlite3_clear_bindings(statement.get());
+    m_idle.try_emplace(sql, std::move(statement));
+} catch (const std::bad_alloc&) {
+    // It is prepared anew the next time.
+}
+
+Statement::Statement(Database& database, std::string sql)
+    : m_database(database), m_sql(std::move(sql)), m_statement(database.take(m_sql)) {}
+
+Statement::~Statement() {
+    m_database.giveBack(m_sql, std::move(m_statement));
 }
 
 void Statement::bind(int parameter, std::int64_t number) {
@@ -105,7 +124,7 @@ std::string Statement::text(int column) const {
 
 Transaction::Transaction(Database& database) : m_database(database) {
     // At once for writing: one that begins as a reader cannot wait for its turn.
-    m_database.execute("BEGIN IMMEDIATE");
+    Statement(m_database, "BEGIN IMMEDIATE").step();
 }
 
 Transaction::~Transaction() {
@@ -118,7 +137,7 @@ Transaction::~Transaction() {
 }
 
 void Transaction::commit() {
-    m_database.execute("COMMIT");
+    Statement(m_database, "COMMIT").step();
     m_isOpen = false;
 }
 

@@ -2,6 +2,7 @@
 #pragma once
 
 #include <cstdint>
+#include <map>
 #include <memory>
 #include <optional>
 #include <stdexcept>
@@ -42,13 +43,27 @@ class Database {
     struct Close {
         void operator()(sqlite3* database) const;
     };
+    struct Finalize {
+        void operator()(sqlite3_stmt* statement) const;
+    };
+    using Prepared = std::unique_ptr<sqlite3_stmt, Finalize>;
+
+    Prepared take(const std::string& sql);
+    void giveBack(const std::string& sql, Prepared statement) noexcept;
+
     std::unique_ptr<sqlite3, Close> m_database;
+    /// Those that nobody uses, by their texts: to read a text takes longer than to carry it out. SQLite reads
+    /// one again by itself when the schema has changed.
+    std::map<std::string, Prepared> m_idle;
 };
 
 /// A statement with its parameters, which are counted from 1, as columns are from 0.
 class Statement {
   public:
-    Statement(Database& database, const std::string& sql);
+    Statement(Database& database, std::string sql);
+    ~Statement();
+    Statement(const Statement&) = delete;
+    Statement& operator=(const Statement&) = delete;
 
     void bind(int parameter, std::int64_t number);
     void bind(int parameter, const std::string& text);  ///< an empty one as no value
@@ -60,11 +75,9 @@ class Statement {
     std::string text(int column) const;
 
   private:
-    struct Finalize {
-        void operator()(sqlite3_stmt* statement) const;
-    };
     Database& m_database;
-    std::unique_ptr<sqlite3_stmt, Finalize> m_statement;
+    std::string m_sql;
+    Database::Prepared m_statement;
 };
 
 /// Either all changes of a scope, or none: without commit() none.

@@ -90,6 +90,13 @@ std::string tableSql() {
     return sql + ");" + kIndexes;
 }
 
+std::string insertSql() {
+    std::string places = "?1";
+    for (int i = 2; i <= kColumnCount; ++i)
+        places += ", ?" + std::to_string(i);
+    return "INSERT INTO updates(" + columnNames() + ") VALUES(" + places + ")";
+}
+
 /// Binds the columns, in their order, as the parameters from 1 on.
 void bindColumns(Statement& statement, const Record& record) {
     for (int i = 0; i < kColumnCount; ++i)
@@ -172,10 +179,8 @@ void Store::prove() {
 
 Store::Pruned Store::add(Record& record, std::int64_t most) {
     Transaction transaction(m_database);
-    std::string places = "?1";
-    for (int i = 2; i <= kColumnCount; ++i)
-        places += ", ?" + std::to_string(i);
-    Statement insert(m_database, "INSERT INTO updates(" + columnNames() + ") VALUES(" + places + ")");
+    static const std::string kSql = insertSql();
+    Statement insert(m_database, kSql);
     bindColumns(insert, record);
     insert.step();
     record.id = m_database.lastId();

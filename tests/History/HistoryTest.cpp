@@ -95,6 +95,21 @@ TEST_F(HistoryTest, KeepsARefusalAndAnUpdateForThisUserAlone) {
     }
 }
 
+TEST_F(HistoryTest, TakesNothingFromTheRecordBefore) {
+    {
+        History history(settings());
+        history.refused(attempt(), 5, "it was wrong");
+        core::UpdateAttempt bare;
+        bare.mostRecords = attempt().mostRecords;
+        history.refused(bare, 0, "");
+    }
+    const std::vector<Record> found = records();
+    ASSERT_EQ(found.size(), 2U);
+    EXPECT_EQ(found[0].uri + found[0].address + found[0].adapter + found[0].reason, "");
+    EXPECT_FALSE(found[0].returnValue);
+    EXPECT_EQ(found[1].reason, "it was wrong");
+}
+
 TEST_F(HistoryTest, CompletesWhatAKilledProcessBeganAndNoOther) {
     const pid_t child = ::fork();
     History history(settings());
