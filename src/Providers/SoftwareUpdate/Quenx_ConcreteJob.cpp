@@ -58,23 +58,27 @@ __attribute__((init_priority(1000))) utils::Atomic<std::string> Quenx_ConcreteJo
 Quenx_ConcreteJob::Quenx_ConcreteJob(std::string adapterName, int jobId, std::string& uri,
                                      std::vector<std::uint16_t>& installOptions,
                                      std::vector<std::string>& installOptionValues)
-    : m_adapterName(std::move(adapterName)), m_jobId(jobId) {
+    // Braces go from left to right. A refusal does not pay for the properties of a job.
+    : Quenx_ConcreteJob{Beginning{}, verifyImage({adapterName, uri, installOptions, installOptionValues}),
+                        std::move(adapterName), jobId} {}
+
+Quenx_ConcreteJob::Quenx_ConcreteJob(const Beginning& beginning, VerifiedImage verified,
+                                     std::string adapterName, int jobId) try
+    : m_adapterName(std::move(adapterName)),
+      m_jobId(jobId),
+      m_flashImage(std::move(verified.image.bytes)),
+      m_flashImageSize(verified.image.size),
+      m_imageTypes(std::move(verified.image.types)),
+      m_beginning(beginning) {
     // For its worker, and so for a flash: no request may be the one that waits.
     setDestructionWaits();
-    VerifiedImage verified = verifyImage({m_adapterName, uri, installOptions, installOptionValues});
-    m_claim = std::move(verified.claim);
-    m_flashImage = std::move(verified.image.bytes);
-    m_flashImageSize = verified.image.size;
-    m_imageTypes = std::move(verified.image.types);
-    try {
-        m_claim.passTo(fmt("Quenx:%s", getUniqId().c_str()));
-        m_myThread = std::make_unique<JobThread>(this);
-    } catch (...) {
-        m_claim.releaseIfConfigured();
-        throw;
-    }
+    verified.claim.passTo(fmt("Quenx:%s", getUniqId().c_str()));
+    m_myThread = std::make_unique<JobThread>(this);
     // What verification took. The end of the job sets it again.
     m_elapsedTime = timeSinceStart();
+    m_claim = std::move(verified.claim);
+} catch (...) {
+    verified.claim.releaseIfConfigured();
 }
 
 Quenx_ConcreteJob::~Quenx_ConcreteJob() {
@@ -88,7 +92,7 @@ std::string Quenx_ConcreteJob::getUniqId() const {
 
 utils::Time Quenx_ConcreteJob::timeSinceStart() const {
     // Not the difference of two times of day, between which the clock may have been set.
-    return utils::Time(os::getMonotonicuSeconds() - m_start);
+    return utils::Time(os::getMonotonicuSeconds() - m_beginning.monotonic);
 }
 
 const std::uint8_t* Quenx_ConcreteJob::getFlashImage() const {
@@ -229,7 +233,7 @@ void Quenx_ConcreteJob::refresh() {
             ScheduledStartTime, RunMonth, RunDay, RunDayOfWeek, RunStartInterval, LocalOrUtcTime, UntilTime,
             Notify, Owner, RecoveryAction, OtherRecoveryAction);
     OperationalStatus = {kOperationalStatusOk};
-    StartTime = m_startTime;
+    StartTime = m_beginning.time;
     JobRunTimes = 1;
     Priority = 0;
     DeleteOnCompletion = false;

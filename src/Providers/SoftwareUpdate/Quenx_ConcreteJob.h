@@ -20,6 +20,7 @@ namespace core {
 class UpdateRecord;
 }
 class JobThread;
+struct VerifiedImage;
 
 /// The requested states of jobs; only Start is accepted.
 enum RequestedState : std::uint16_t { RequestedStateStart = 2 };
@@ -96,6 +97,13 @@ class Quenx_ConcreteJob : public CIM_ConcreteJob {
                                     std::vector<utils::FirmwareType>& imageTypes);
 
   private:
+    /// When the construction began, by the clock and by what the clock's being set does not touch.
+    struct Beginning {
+        utils::Time time;
+        std::uint64_t monotonic = os::getMonotonicuSeconds();
+    };
+    Quenx_ConcreteJob(const Beginning& beginning, VerifiedImage verified, std::string adapterName, int jobId);
+
     /// True for the one caller who may start the job.
     bool claimStart();
     utils::Time timeSinceStart() const;
@@ -108,7 +116,7 @@ class Quenx_ConcreteJob : public CIM_ConcreteJob {
     std::uint32_t m_flashImageSize QUENX_GUARDED_BY(m_stateMutex) = 0;
     std::vector<utils::FirmwareType> m_imageTypes;  ///< set by the constructor only
     std::shared_ptr<core::UpdateRecord> m_record;   ///< set before the worker starts
-    const utils::Time m_startTime;
+    const Beginning m_beginning;
     utils::Time m_elapsedTime QUENX_GUARDED_BY(m_stateMutex);
     JobStateVal m_jobState QUENX_GUARDED_BY(m_stateMutex) = JobStateNew;
     bool m_startClaimed QUENX_GUARDED_BY(m_stateMutex) = false;
@@ -121,6 +129,5 @@ class Quenx_ConcreteJob : public CIM_ConcreteJob {
     std::uint32_t m_percentComplete QUENX_GUARDED_BY(m_stateMutex) = 0;
     /// The properties say how the job ended, so a refresh would change nothing. False again with any change.
     bool m_isEndServed QUENX_GUARDED_BY(m_stateMutex) = false;
-    const std::uint64_t m_start = os::getMonotonicuSeconds();  ///< measures what m_startTime tells
     mutable utils::Mutex m_stateMutex;  ///< what the worker writes and requests read; held for moments only
 };
