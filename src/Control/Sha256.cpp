@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Control/Sha256.h"
 
+#include <dlfcn.h>
 #include <gnutls/crypto.h>
 #include <unistd.h>
 
@@ -8,6 +9,7 @@
 #include <array>
 #include <cerrno>
 #include <new>
+#include <stdexcept>
 #include <system_error>
 #include <vector>
 
@@ -15,24 +17,64 @@
 
 namespace control {
 
+namespace {
+
+struct HashFunctions {
+    decltype(&::gnutls_hash_init) init;
+    decltype(&::gnutls_hash) add;
+    decltype(&::gnutls_hash_output) output;
+    decltype(&::gnutls_hash_deinit) deinit;
+};
+
+[[noreturn]] void refuse(const char* file) {
+    const char* const why = ::dlerror();
+    throw std::runtime_error(std::string("cannot load the library for SHA-256 sums: ") +
+                             (why == nullptr ? file : why) + "; install the package libgnutls30");
+}
+
+/// Stays loaded.
+HashFunctions load() {
+    // Its binary interface; the headers that this is compiled with are the same one's.
+    constexpr const char* kFile = "libgnutls.so.30";
+    void* const library = ::dlopen(kFile, RTLD_NOW | RTLD_LOCAL);
+    if (library == nullptr) refuse(kFile);
+    const auto find = [library]<class Function>(const char* name, Function& function) {
+        function = reinterpret_cast<Function>(::dlsym(library, name));
+        if (function == nullptr) refuse(kFile);
+    };
+    HashFunctions found{};
+    find("gnutls_hash_init", found.init);
+    find("gnutls_hash", found.add);
+    find("gnutls_hash_output", found.output);
+    find("gnutls_hash_deinit", found.deinit);
+    return found;
+}
+
+const HashFunctions& functions() {
+    static const HashFunctions kFunctions = load();
+    return kFunctions;
+}
+
+}  // namespace
+
 void Sha256::Free::operator()(hash_hd_st* hash) const {
-    ::gnutls_hash_deinit(hash, nullptr);
+    functions().deinit(hash, nullptr);
 }
 
 Sha256::Sha256() {
     gnutls_hash_hd_t hash = nullptr;
-    if (::gnutls_hash_init(&hash, GNUTLS_DIG_SHA256) != 0) throw std::bad_alloc();
+    if (functions().init(&hash, GNUTLS_DIG_SHA256) != 0) throw std::bad_alloc();
     m_hash.reset(hash);
 }
 
 void Sha256::add(const void* bytes, std::size_t size) {
-    ::gnutls_hash(m_hash.get(), bytes, size);
+    functions().add(m_hash.get(), bytes, size);
 }
 
 std::string Sha256::take() {
     constexpr std::string_view kHex = "0123456789abcdef";
     std::array<unsigned char, kDigits / 2> sum{};
-    ::gnutls_hash_output(m_hash.get(), sum.data());
+    functions().output(m_hash.get(), sum.data());
     std::string digits;
     for (const unsigned char byte : sum)
         digits += {kHex[byte >> 4], kHex[byte & 0xF]};

@@ -1,10 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "History/Look.h"
 
-#include <gnutls/crypto.h>
-
-#include <array>
-
+#include "Control/Sha256.h"
 #include "MidAPI/Devlink/PldmPackage.h"
 #include "MidAPI/Image/OptionRom.h"
 #include "MidAPI/ma.h"
@@ -16,12 +13,9 @@ namespace history {
 namespace {
 
 std::string sha256Of(std::span<const std::uint8_t> file) {
-    std::array<std::uint8_t, 32> sum{};
-    if (gnutls_hash_fast(GNUTLS_DIG_SHA256, file.data(), file.size(), sum.data()) != 0) return "";
-    std::string text;
-    for (const std::uint8_t byte : sum)
-        text += utils::hexByte(byte);
-    return text;
+    control::Sha256 hash;
+    hash.add(file.data(), file.size());
+    return hash.take();
 }
 
 void append(std::string& list, const std::string& name, const std::string& version) {
