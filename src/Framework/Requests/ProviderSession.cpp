@@ -86,8 +86,13 @@ std::string ProviderSession::loadHistory() {
     // Where a disk hangs, the history's thread is in the library when everybody else has left.
     const LibraryEntry entry("history/libQuenx_History.so", "quenx_openHistory");
     using Open = void (*)(ProviderSession&);
-    if (entry.address() != nullptr) reinterpret_cast<Open>(entry.address())(*this);
-    return entry.problem();
+    if (entry.address() == nullptr) return entry.problem();
+    try {
+        reinterpret_cast<Open>(entry.address())(*this);
+        return "";
+    } catch (const std::exception& error) {
+        return error.what();
+    }
 }
 
 ProviderSession::ProviderSession(const std::string& configurationFile, const std::string& policyFile)
