@@ -195,6 +195,12 @@ InstanceValue readInstance(CimInstance& instance, CimPath path, WantedProperties
     return result;
 }
 
+InstanceValue readInstance(CimInstance& instance, const std::string& namespaceName) {
+    const PropertyFilter everything;
+    WantedProperties wanted(everything);
+    return readInstance(instance, *instance.getPath(), wanted, namespaceName);
+}
+
 std::string shownPath(const CimPath& path) {
     constexpr std::size_t kMost = 4096;
     const std::size_t bytes = bytesOf(path);

@@ -74,6 +74,8 @@ class QUENX_EXPORT WantedProperties {
 /// A copy of the instance, under its lock; paths in it are completed with the namespace.
 InstanceValue readInstance(CimInstance& instance, CimPath path, WantedProperties& wanted,
                            const std::string& namespaceName);
+/// The same of all its properties, with the path of its own.
+InstanceValue readInstance(CimInstance& instance, const std::string& namespaceName);
 
 /// An instance where it is, its lock held: the properties that are wanted, none of them a reference.
 struct InstanceCells {

@@ -4,6 +4,7 @@
 #include <dlfcn.h>
 
 #include <algorithm>
+#include <exception>
 #include <filesystem>
 #include <utility>
 

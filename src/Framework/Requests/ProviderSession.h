@@ -6,6 +6,7 @@
 #include <string>
 #include <vector>
 
+#include "Framework/Events/EventSink.h"
 #include "Framework/Requests/CimOperations.h"
 #include "Framework/Requests/ImageVerifier.h"
 #include "Framework/Requests/UpdateSink.h"
@@ -95,6 +96,10 @@ class QUENX_EXPORT ProviderSession {
     /// for fronts that cannot link it. Returns why it cannot be loaded; empty when it was.
     std::string loadHistory();
 
+    /// Has the providers tell this sink of what happens to their instances, while somebody listens (see
+    /// EventInterest). To be called before they are loaded, once; without it they tell nobody.
+    void tellEvents(std::shared_ptr<EventSink> sink) { m_events.emplace(std::move(sink)); }
+
     /// Keeps an agent beside those of the libraries. To be called once at most.
     /// @param agent  ends it when given up
     void serve(std::shared_ptr<void> agent) { m_agent = std::move(agent); }
@@ -117,6 +122,7 @@ class QUENX_EXPORT ProviderSession {
     LoadedVerifier m_verifier;
     const InstalledVerifier m_installedVerifier{m_verifier};
     std::optional<InstalledSink> m_history;
+    std::optional<InstalledEventSink> m_events;
     ProviderLibraries m_libraries;
     std::shared_ptr<void> m_agent;
     std::shared_ptr<CimOperations> m_operations;

@@ -131,6 +131,15 @@ void Quenx_ConcreteJob::endRecord(bool succeeded) {
 
 void Quenx_ConcreteJob::setJobState(JobStateVal state) {
     QUENX_DEBUG("%d -> %d", getJobState(), state);
+    enterState(state);
+    if (hasEnded(state)) {
+        m_events.ended();
+    } else {
+        m_events.changed();
+    }
+}
+
+void Quenx_ConcreteJob::enterState(JobStateVal state) {
     // Declared before the lock and so freed after it: an image has megabytes.
     std::unique_ptr<std::uint8_t[]> released;
     const utils::Mutex::AutoLocker lock(m_stateMutex);

@@ -11,6 +11,7 @@
 #include "Providers/Schema/CIM_ConcreteJob.h"
 #include "Providers/Schema/ValueMaps.h"
 #include "Providers/SoftwareUpdate/AdapterClaim.h"
+#include "Providers/SoftwareUpdate/JobEvents.h"
 #include "Utils/FirmwareTypes.h"
 #include "Utils/Os/Linux/Mutex.h"
 #include "Utils/Os/Linux/linux.h"
@@ -74,8 +75,10 @@ class Quenx_ConcreteJob : public CIM_ConcreteJob {
     void setRecord(std::shared_ptr<core::UpdateRecord> record) { m_record = std::move(record); }
     /// The flash has ended, and the last error is that of its end.
     void endRecord(bool succeeded);
-    /// Enters a state. Ending the job frees the image and the adapter claim in the same step, so that whoever
-    /// sees the end can start the next update.
+    /// What is told of it to those who listen.
+    JobEvents& events() { return m_events; }
+    /// Enters a state, and tells of it. Ending the job frees the image and the adapter claim in the same
+    /// step, so that whoever sees the end can start the next update.
     void setJobState(JobStateVal state);
     /// 0 accepted, 4 the worker could not be started, 5 no such request, 4097 the job is not New. The
     /// time-out is accepted and ignored.
@@ -104,6 +107,7 @@ class Quenx_ConcreteJob : public CIM_ConcreteJob {
     };
     Quenx_ConcreteJob(const Beginning& beginning, VerifiedImage verified, std::string adapterName, int jobId);
 
+    void enterState(JobStateVal state);
     /// True for the one caller who may start the job.
     bool claimStart();
     utils::Time timeSinceStart() const;
@@ -130,4 +134,5 @@ class Quenx_ConcreteJob : public CIM_ConcreteJob {
     /// The properties say how the job ended, so a refresh would change nothing. False again with any change.
     bool m_isEndServed QUENX_GUARDED_BY(m_stateMutex) = false;
     mutable utils::Mutex m_stateMutex;  ///< what the worker writes and requests read; held for moments only
+    JobEvents m_events{*this};
 };

@@ -69,10 +69,11 @@ int Quenx_ConcreteJobClass::createJob(UpdateOrder& order, Quenx_ConcreteJob*& jo
         created->refresh();
         // Before the flash, so that one that never ends has its record.
         if (!UpdateReport::begin(*created)) {
-            created->setJobState(JobStateException);  // gives the claim back
+            created->setJobState(JobStateException);  // gives the claim back; nobody has been told of it
             m_instances.remove(created);
             return VerifyJobResult::UnspecifiedError;
         }
+        created->events().created();
         utils::Time timeout;
         timeout.setIntervalInSeconds(kStartTimeout);
         if (created->requestStateChange(RequestedStateStart, timeout) == 0) {
@@ -80,15 +81,20 @@ int Quenx_ConcreteJobClass::createJob(UpdateOrder& order, Quenx_ConcreteJob*& jo
             return VerifyJobResult::Success;
         }
     } catch (...) {
-        if (listed) m_instances.remove(created);
+        if (listed) unlist(*created);
         // Where listing it failed, the job has gone already, and only the name is left.
         AdapterClaim::releaseIfConfigured(Quenx_ConcreteJob::m_servicedAdapter, order.adapterName);
         throw;
     }
     core::NotedCall::noteReason(core::ReasonId::WorkerNotStarted);
     // Its destruction waits for a thread that never ran, so it is left to the list's release.
-    m_instances.remove(created);
+    unlist(*created);
     return VerifyJobResult::JobStartFailed;
+}
+
+void Quenx_ConcreteJobClass::unlist(Quenx_ConcreteJob& job) {
+    const JobEvents::Deletion told(job.events());
+    m_instances.remove(&job);
 }
 
 int Quenx_ConcreteJobClass::DeleteInstance(core::CimPath& path) {
@@ -110,6 +116,7 @@ int Quenx_ConcreteJobClass::DeleteInstance(core::CimPath& path) {
     }
     QUENX_DEBUG("Removing job: %s", job->getUniqId().c_str());
     // The job is not stopped: a flash that breaks off leaves a card without firmware.
+    const JobEvents::Deletion told(job->events());
     job->setDeleted(true);
     return 0;
 }

@@ -56,6 +56,7 @@ class Quenx_ConcreteJobClass : public ListedClass<Quenx_ConcreteJob> {
 
   private:
     int createJob(UpdateOrder& order, Quenx_ConcreteJob*& job);
+    void unlist(Quenx_ConcreteJob& job);
 
     std::atomic<std::int32_t> m_nextJobId{1};
     ConcreteJobFactory m_factory;

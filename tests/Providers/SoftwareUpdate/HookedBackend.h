@@ -23,6 +23,7 @@ class HookedBackend : public ma::Backend {
     std::optional<int> prepareStatus;
     std::optional<std::string> capabilityText;  ///< also of a word that was written
     std::function<void(const std::string& adapter, ma::AdapterInfo& info)> told;
+    std::atomic<int> progress{-1};  ///< instead of what the next one says; may change at any time
 
     /// Has every call of the operation wait from now on, until letGo().
     void hold(const std::string& operation) {
@@ -70,7 +71,9 @@ class HookedBackend : public ma::Backend {
         return isDone;
     }
     std::uint16_t getFlashImageUpdateProgress(const std::string& adapter) override {
-        return at("getFlashImageUpdateProgress").getFlashImageUpdateProgress(adapter);
+        const std::uint16_t next = at("getFlashImageUpdateProgress").getFlashImageUpdateProgress(adapter);
+        const int answer = progress;
+        return answer < 0 ? next : static_cast<std::uint16_t>(answer);
     }
     bool setBootType(const std::string& adapter, ma::BootType type) override {
         return at("setBootType").setBootType(adapter, type);
