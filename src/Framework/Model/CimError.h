@@ -20,6 +20,7 @@ enum class CimStatus {
     NoSuchProperty = 12,
     TypeMismatch = 13,
     QueryLanguageNotSupported = 14,
+    InvalidQuery = 15,
     MethodNotAvailable = 16,
     MethodNotFound = 17,
     InvalidEnumerationContext = 21,
@@ -27,7 +28,8 @@ enum class CimStatus {
     FilteredEnumerationNotSupported = 25,
     ContinuationOnErrorNotSupported = 26,
     ServerLimitsExceeded = 27,
-    ServerIsShuttingDown = 28
+    ServerIsShuttingDown = 28,
+    QueryFeatureNotSupported = 29
 };
 
 /// A request that ends with a CIM status. Unlike the providers' exceptions it does not log itself: a client's

@@ -32,7 +32,7 @@ core::InstanceSnapshot JobEvents::snapshot() const noexcept try {
     m_job.refresh();
     return core::snapshotOf(m_job);
 } catch (...) {
-    QUENX_ERROR("Those who listen could not be told of a job yet");
+    QUENX_ERROR("A job could not be shown to those who listen; they learn of it with its next change");
     return nullptr;
 }
 
