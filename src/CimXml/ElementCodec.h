@@ -127,6 +127,9 @@ std::string_view propertyElement(core::CimType type, bool isArray);
 /// The start of that element, with its name and type.
 void startProperty(XmlWriter& writer, std::string_view name, core::CimType type, bool isArray);
 
+/// INSTANCE. Null properties are written as elements without a value.
+void writeInstance(XmlWriter& writer, const core::InstanceValue& instance);
+
 /// What an enumeration answers for an instance: VALUE.NAMEDINSTANCE.
 void writeNamedInstance(XmlWriter& writer, const core::InstanceValue& instance);
 

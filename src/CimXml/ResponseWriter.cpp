@@ -160,6 +160,10 @@ void startProperty(XmlWriter& writer, std::string_view name, core::CimType type,
     if (element != "PROPERTY.REFERENCE") writer.attribute("TYPE", core::typeName(type));
 }
 
+void writeInstance(XmlWriter& writer, const core::InstanceValue& instance) {
+    writeInstance(writer, instance, nullptr);
+}
+
 void writeNamedInstance(XmlWriter& writer, const core::InstanceValue& instance) {
     const IntrinsicResult result{.kind = ResultKind::NamedInstances};
     ResultWriter{writer, result, {}}.write(instance);

@@ -1,0 +1,239 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "Indications/Delivery/Delivery.h"
+
+#include <algorithm>
+#include <map>
+#include <mutex>
+#include <vector>
+
+#include "Indications/Delivery/Transfer.h"
+#include "Utils/Exception.h"
+#include "Utils/Log.h"
+#include "Utils/Os/Linux/Thread.h"
+
+namespace indications {
+
+namespace {
+
+constexpr std::size_t kMostTransfers = 16;
+/// To those that have failed, which may each take all the time there is.
+constexpr std::size_t kMostToFailing = 8;
+
+using Multi = std::unique_ptr<CURLM, decltype(&::curl_multi_cleanup)>;
+
+Multi newMulti() {
+    static const CURLcode prepared = ::curl_global_init(CURL_GLOBAL_DEFAULT);
+    Multi multi(prepared == CURLE_OK ? ::curl_multi_init() : nullptr, ::curl_multi_cleanup);
+    if (multi == nullptr) throw std::bad_alloc();
+    return multi;
+}
+
+/// A listener, and what is to be brought there.
+struct Target {
+    std::string url;
+    AddressPolicy policy;
+    Queue queue;
+};
+
+}  // namespace
+
+/// The thread, and what it shares with others.
+class Delivery::Courier : public utils::Thread {
+  public:
+    explicit Courier(DeliverySettings settings) : m_settings(std::move(settings)), m_multi(newMulti()) {}
+    ~Courier() override {
+        requestStop();
+        wake();
+        shutdown();
+        for (const UnderWay& each : m_underWay)
+            ::curl_multi_remove_handle(m_multi.get(), each.transfer->handle());
+    }
+
+    void execute() override;
+
+    /// Calls with the target of the name, if there is one, and has the thread look at it.
+    template <class Call>
+    void with(const std::string& destination, const Call& call) {
+        {
+            const std::lock_guard lock(m_mutex);
+            const auto found = m_targets.find(destination);
+            if (found == m_targets.end()) return;
+            call(found->second->queue);
+            makeRoom();
+        }
+        wake();
+    }
+
+    void add(const std::string& destination, std::shared_ptr<Target> target) {
+        const std::lock_guard lock(m_mutex);
+        m_targets[destination] = std::move(target);
+    }
+    void remove(const std::string& destination) {
+        const std::lock_guard lock(m_mutex);
+        m_targets.erase(destination);
+    }
+
+    const DeliverySettings& settings() const { return m_settings; }
+
+  private:
+    struct UnderWay {
+        std::string destination;
+        std::shared_ptr<Target> target;  ///< which may have been removed meanwhile
+        std::unique_ptr<Transfer> transfer;
+        bool toFailing = false;
+    };
+
+    void wake() noexcept { ::curl_multi_wakeup(m_multi.get()); }
+    void makeRoom();
+    void beginDue();
+    /// Whether something is under way there now that was not before.
+    bool begin(const std::string& destination, const std::shared_ptr<Target>& target);
+    void endDone();
+    void end(UnderWay& done, CURLcode code);
+    int pause() const;
+
+    const DeliverySettings m_settings;
+    const Multi m_multi;
+    mutable std::mutex m_mutex;  ///< for the targets and their queues; held for moments
+    std::map<std::string, std::shared_ptr<Target>> m_targets;
+    // The thread's own.
+    std::vector<UnderWay> m_underWay;
+    std::string m_last;  ///< to which something was sent
+};
+
+/// Where all together is too much, the longest queue pays for it.
+void Delivery::Courier::makeRoom() {
+    while (true) {
+        std::size_t all = 0;
+        Queue* longest = nullptr;
+        for (const auto& [name, target] : m_targets) {
+            all += target->queue.bytes();
+            if (longest == nullptr || target->queue.bytes() > longest->bytes()) longest = &target->queue;
+        }
+        if (all <= m_settings.mostBytesOfAll || !longest->dropOldest()) return;
+    }
+}
+
+bool Delivery::Courier::begin(const std::string& destination, const std::shared_ptr<Target>& target) {
+    const bool toFailing = target->queue.counters().isFailing;
+    const auto failing = std::ranges::count_if(m_underWay, [](const auto& each) { return each.toFailing; });
+    if (toFailing && static_cast<std::size_t>(failing) >= kMostToFailing) return false;
+    const Message* const message = target->queue.begin(Clock::now());
+    if (message == nullptr) return false;
+    try {
+        auto transfer = std::make_unique<Transfer>(target->url, target->policy, message->body, m_settings);
+        m_underWay.push_back({destination, target, std::move(transfer), toFailing});
+        if (::curl_multi_add_handle(m_multi.get(), m_underWay.back().transfer->handle()) == CURLM_OK)
+            return true;
+        m_underWay.pop_back();
+    } catch (const std::exception& error) {
+        QUENX_ERROR("An indication could not be sent: %s", error.what());
+    }
+    target->queue.end(Outcome::Failed, m_settings, Clock::now());
+    return false;
+}
+
+void Delivery::Courier::beginDue() {
+    const std::lock_guard lock(m_mutex);
+    // From the one after the last, so that each has its turn.
+    auto next = m_targets.upper_bound(m_last);
+    for (std::size_t i = 0; i < m_targets.size() && m_underWay.size() < kMostTransfers; ++i, ++next) {
+        if (next == m_targets.end()) next = m_targets.begin();
+        if (begin(next->first, next->second)) m_last = next->first;
+    }
+}
+
+void Delivery::Courier::end(UnderWay& done, CURLcode code) {
+    const Transfer::Result result = done.transfer->result(code);
+    bool wasFailing = false;
+    bool isFailing = false;
+    {
+        const std::lock_guard lock(m_mutex);
+        Queue& queue = done.target->queue;
+        wasFailing = queue.counters().isFailing;
+        queue.end(result.outcome, m_settings, Clock::now());
+        isFailing = queue.counters().isFailing;
+    }
+    // Once for each change: a listener that is gone would fill the log.
+    if (isFailing && !wasFailing) {
+        QUENX_ERROR("Indications do not reach the destination '%s': %s", done.destination.c_str(),
+                    result.problem.c_str());
+    } else if (wasFailing && !isFailing) {
+        QUENX_ERROR("Indications reach the destination '%s' again", done.destination.c_str());
+    }
+}
+
+void Delivery::Courier::endDone() {
+    int left = 0;
+    while (const CURLMsg* message = ::curl_multi_info_read(m_multi.get(), &left)) {
+        if (message->msg != CURLMSG_DONE) continue;
+        CURL* const handle = message->easy_handle;
+        const CURLcode code = message->data.result;
+        const auto found = std::ranges::find_if(
+            m_underWay, [&](const UnderWay& each) { return each.transfer->handle() == handle; });
+        ::curl_multi_remove_handle(m_multi.get(), handle);
+        end(*found, code);
+        m_underWay.erase(found);
+    }
+}
+
+/// Until the next try is due, in milliseconds. libcurl returns earlier for what is under way.
+int Delivery::Courier::pause() const {
+    constexpr auto kLongest = std::chrono::milliseconds(60'000);
+    const std::lock_guard lock(m_mutex);
+    auto shortest = kLongest;
+    const auto now = Clock::now();
+    for (const auto& [name, target] : m_targets) {
+        const auto due = target->queue.due();
+        // What is due already waits for a transfer to end.
+        if (due && *due > now)
+            shortest = std::min(shortest, std::chrono::ceil<std::chrono::milliseconds>(*due - now));
+    }
+    return static_cast<int>(shortest.count());
+}
+
+void Delivery::Courier::execute() {
+    std::optional<Clock::time_point> deadline;
+    while (true) {
+        if (isStopRequested() && !deadline) deadline = Clock::now() + m_settings.farewellTime;
+        if (deadline && (m_underWay.empty() || Clock::now() >= *deadline)) return;
+        if (!deadline) beginDue();
+        int running = 0;
+        ::curl_multi_perform(m_multi.get(), &running);
+        const std::size_t before = m_underWay.size();
+        endDone();
+        if (m_underWay.size() != before) continue;  // there may be a next one
+        ::curl_multi_poll(m_multi.get(), nullptr, 0, deadline ? 10 : pause(), nullptr);
+    }
+}
+
+Delivery::Delivery(DeliverySettings settings) : m_courier(std::make_unique<Courier>(std::move(settings))) {
+    m_courier->start();
+}
+
+Delivery::~Delivery() = default;
+
+void Delivery::add(const std::string& destination, const std::string& url, const AddressPolicy& policy,
+                   const std::string& context) {
+    m_courier->add(destination, std::make_shared<Target>(Target{url, policy, Queue(context)}));
+}
+
+void Delivery::remove(const std::string& destination) {
+    m_courier->remove(destination);
+}
+
+void Delivery::send(const std::string& destination, std::uint64_t tag, const Body& body) {
+    m_courier->with(destination, [&](Queue& queue) { queue.add(tag, body, m_courier->settings()); });
+}
+
+void Delivery::drop(const std::string& destination, std::uint64_t tag) {
+    m_courier->with(destination, [&](Queue& queue) { queue.drop(tag); });
+}
+
+DeliveryCounters Delivery::counters(const std::string& destination) const {
+    DeliveryCounters counters;
+    m_courier->with(destination, [&](Queue& queue) { counters = queue.counters(); });
+    return counters;
+}
+
+}  // namespace indications

@@ -1,0 +1,194 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "Indications/Delivery/Delivery.h"
+
+#include <gtest/gtest.h>
+
+#include <cstdlib>
+#include <optional>
+
+#include "Framework/Model/CimError.h"
+#include "Indications/Delivery/Destination.h"
+#include "Indications/StrictListener.h"
+#include "Utils/Os/Linux/Thread.h"
+
+namespace {
+
+using indications::Delivery;
+using indications::DeliveryCounters;
+using indications::DeliverySettings;
+using test::StrictListener;
+using Answer = StrictListener::Answer;
+using Step = StrictListener::Step;
+
+indications::AddressPolicy toLoopback() {
+    return indications::AddressPolicy::onlyTo(indications::machineAddress("127.0.0.1").value());
+}
+
+DeliverySettings quick() {
+    DeliverySettings settings;
+    settings.retryPause = std::chrono::milliseconds(5);
+    settings.wholeTime = std::chrono::milliseconds(400);
+    settings.farewellTime = std::chrono::milliseconds(200);
+    return settings;
+}
+
+/// A message that shows its number.
+std::string numbered(const indications::Sequence& sequence) {
+    return "<M ID=\"" + sequence.context + ' ' + std::to_string(sequence.number) + "\"/>";
+}
+
+/// Waits until so many messages have been delivered or given up, and none waits.
+DeliveryCounters settled(const Delivery& delivery, const std::string& destination, std::uint64_t count) {
+    while (true) {
+        const DeliveryCounters counters = delivery.counters(destination);
+        if (counters.delivered + counters.givenUp + counters.overflow >= count) return counters;
+        utils::Thread::msleep(1);
+    }
+}
+
+TEST(DeliveryTest, BringsEverythingInItsOrder) {
+    constexpr std::size_t kMany = 1000;
+    DeliverySettings settings = quick();
+    settings.mostWaiting = kMany;
+    settings.wholeTime = std::chrono::seconds(10);
+    StrictListener listener;
+    // What the environment says of proxies counts for those who use it.
+    ::setenv("http_proxy", "http://127.0.0.1:1", 1);
+    Delivery delivery(settings);
+    delivery.add("one", listener.url(), toLoopback(), "c");
+    delivery.add("two", "127.0.0.1:" + std::to_string(listener.port()), toLoopback(), "d");
+    for (std::size_t i = 0; i < kMany; ++i)
+        delivery.send("one", 1, numbered);
+    delivery.send("two", 1, numbered);
+    delivery.send("nobody", 1,
+                  [](const auto&) -> std::string { throw std::runtime_error("never asked for"); });
+    EXPECT_EQ(settled(delivery, "one", kMany).delivered, kMany);
+    EXPECT_EQ(settled(delivery, "two", 1).delivered, 1U);
+    ::unsetenv("http_proxy");
+    std::vector<std::string> bodies = listener.waitFor(kMany + 1);
+    EXPECT_EQ(std::erase(bodies, numbered({"d", 0})), 1U);
+    for (std::size_t i = 0; i < kMany; ++i)
+        ASSERT_EQ(bodies.at(i), numbered({"c", static_cast<std::int64_t>(i)}));
+    EXPECT_EQ(listener.problems(), std::vector<std::string>());
+}
+
+TEST(DeliveryTest, TriesAgainWhatMayHelp) {
+    const struct {
+        Step step;
+        std::size_t tries;
+        bool isTaken;
+    } cases[] = {
+        {{Answer::Taken, 200}, 1, true},    {{Answer::Nonsense, 200}, 1, true},
+        {{Answer::Endless, 200}, 1, true},  {{Answer::Error, 200}, 4, false},
+        {{Answer::Taken, 503}, 4, false},   {{Answer::Taken, 408}, 4, false},
+        {{Answer::Taken, 400}, 1, false},   {{Answer::Taken, 401}, 1, false},
+        {{Answer::Taken, 501}, 1, false},   {{Answer::Redirect, 302}, 1, false},
+        {{Answer::Nothing, 200}, 4, false}, {{Answer::Never, 200}, 4, false},
+    };
+    for (const auto& each : cases) {
+        StrictListener listener([&](std::size_t) { return each.step; });
+        Delivery delivery(quick());
+        delivery.add("d", listener.url(), toLoopback(), "c");
+        delivery.send("d", 1, numbered);
+        const DeliveryCounters counters = settled(delivery, "d", 1);
+        EXPECT_EQ(counters.delivered, each.isTaken ? 1U : 0U) << each.step.status;
+        EXPECT_EQ(counters.isFailing, !each.isTaken) << each.step.status;
+        // Every try has the same number.
+        EXPECT_EQ(listener.waitFor(each.tries), std::vector<std::string>(each.tries, numbered({"c", 0})))
+            << each.step.status << ' ' << static_cast<int>(each.step.answer);
+    }
+}
+
+TEST(DeliveryTest, KeepsTheOrderWhileItTriesAgainAndAfterItGaveUp) {
+    // The second is not taken at first, the third never; the fourth has one try, and so has the fifth.
+    StrictListener listener([](std::size_t number) {
+        const bool isRefused = number == 1 || (number >= 3 && number <= 7);
+        return Step{isRefused ? Answer::Error : Answer::Taken, 200};
+    });
+    Delivery delivery(quick());
+    delivery.add("d", listener.url(), toLoopback(), "c");
+    for (int i = 0; i < 5; ++i)
+        delivery.send("d", 1, numbered);
+    const DeliveryCounters counters = settled(delivery, "d", 5);
+    EXPECT_EQ(counters.delivered, 3U);
+    EXPECT_EQ(counters.givenUp, 2U);
+    EXPECT_FALSE(counters.isFailing);
+    std::vector<std::string> expected;
+    for (const std::int64_t number : {0, 1, 1, 2, 2, 2, 2, 3, 4})
+        expected.push_back(numbered({"c", number}));
+    EXPECT_EQ(listener.waitFor(9), expected);
+}
+
+TEST(DeliveryTest, LosesTheOldestOfAListenerThatHangsAndNothingOfOthers) {
+    StrictListener hanging([](std::size_t) { return Step{Answer::Never, 200}; });
+    StrictListener listener;
+    DeliverySettings settings = quick();
+    settings.wholeTime = std::chrono::seconds(30);
+    settings.mostWaiting = 10;
+    std::optional<Delivery> delivery(settings);
+    // More than may be under way to listeners that fail; each of these hangs in its first try.
+    for (int i = 0; i < 3; ++i)
+        delivery->add("hangs " + std::to_string(i), hanging.url(), toLoopback(), "h" + std::to_string(i));
+    delivery->add("d", listener.url(), toLoopback(), "c");
+    for (int i = 0; i < 3; ++i)
+        delivery->send("hangs " + std::to_string(i), 1, numbered);
+    hanging.waitFor(3);
+    for (int i = 0; i < 30; ++i) {
+        delivery->send("hangs 0", static_cast<std::uint64_t>(i % 2), numbered);
+        delivery->send("d", 1, numbered);
+        settled(*delivery, "d", static_cast<std::uint64_t>(i) + 1);
+    }
+    EXPECT_EQ(listener.waitFor(30).size(), 30U);
+    EXPECT_EQ(delivery->counters("d").overflow, 0U);
+    EXPECT_EQ(delivery->counters("hangs 0").overflow, 21U);
+    EXPECT_EQ(delivery->counters("hangs 0").waiting, 10U);
+    // What is under way stays, of the rest the other subscription's.
+    delivery->drop("hangs 0", 0);
+    EXPECT_EQ(delivery->counters("hangs 0").waiting, 6U);
+    delivery->remove("hangs 0");
+    EXPECT_EQ(delivery->counters("hangs 0").waiting, 0U);
+    const auto begin = std::chrono::steady_clock::now();
+    delivery.reset();
+    EXPECT_LT(std::chrono::steady_clock::now() - begin, std::chrono::seconds(10));
+}
+
+TEST(DeliveryTest, ConnectsToNoAddressThatThePolicyForbids) {
+    StrictListener listener;
+    const std::string port = std::to_string(listener.port());
+    Delivery delivery(quick());
+    std::size_t added = 0;
+    for (const char* spelling : {"127.0.0.1", "0x7f000001", "127.1", "2130706433", "localhost",
+                                 "[::ffff:127.0.0.1]", "0", "[::1]"}) {
+        const std::string name = std::to_string(added++);
+        delivery.add(name, std::string("http://") + spelling + ":" + port,
+                     indications::AddressPolicy::anywhere(), "c");
+        delivery.send(name, 1, numbered);
+        EXPECT_EQ(settled(delivery, name, 1).givenUp, 1U) << spelling;
+    }
+    EXPECT_EQ(listener.waitFor(0).size(), 0U);
+}
+
+TEST(DeliveryTest, TakesUrlsOfListenersOnly) {
+    using indications::requireDestination;
+    const auto isTaken = [](const std::string& url) {
+        try {
+            requireDestination(url);
+            return true;
+        } catch (const core::CimError& error) {
+            EXPECT_EQ(error.status(), core::CimStatus::InvalidParameter);
+            EXPECT_EQ(std::string(error.what()).find("secret"), std::string::npos);
+            return false;
+        }
+    };
+    for (const char* url : {"http://h:5000", "https://h.example/CIMListener/x", "h:5000", "10.0.0.1:5988/a",
+                            "HTTP://[2001:db8::1]:5000/"})
+        EXPECT_TRUE(isTaken(url)) << url;
+    for (const std::string& url :
+         {std::string(), std::string("file:///etc/passwd"), std::string("gopher://h:70/x"),
+          std::string("http://user:secret@h:5000/"), std::string("http://user@h/"),
+          std::string("http://h:99999/"), std::string("http://h/a b"), std::string("http://h/\r\nX: y"),
+          std::string("http://"), "http://h/" + std::string(1024, 'a')})
+        EXPECT_FALSE(isTaken(url)) << url;
+}
+
+}  // namespace

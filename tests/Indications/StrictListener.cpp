@@ -1,0 +1,195 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "Indications/StrictListener.h"
+
+#include <arpa/inet.h>
+#include <netinet/in.h>
+#include <sys/socket.h>
+#include <unistd.h>
+
+#include <array>
+#include <map>
+#include <sstream>
+
+#include "Framework/Model/CimType.h"
+
+namespace test {
+
+namespace {
+
+/// The head of a request, and as much of its body as its length says.
+struct HttpMessage {
+    std::string requestLine;
+    std::map<std::string, std::string> headers;  ///< by folded name
+    std::string body;
+
+    std::string header(const std::string& name) const {
+        const auto found = headers.find(core::foldName(name));
+        return found == headers.end() ? "(none)" : found->second;
+    }
+};
+
+HttpMessage readMessage(int connection) {
+    std::string bytes;
+    std::array<char, 4096> buffer{};
+    std::size_t whole = std::string::npos;
+    HttpMessage message;
+    while (bytes.size() < whole) {
+        const ssize_t count = ::recv(connection, buffer.data(), buffer.size(), 0);
+        if (count <= 0) return {};
+        bytes.append(buffer.data(), static_cast<std::size_t>(count));
+        const std::size_t end = bytes.find("\r\n\r\n");
+        if (end == std::string::npos || whole != std::string::npos) continue;
+        std::istringstream head(bytes.substr(0, end));
+        std::getline(head, message.requestLine, '\r');
+        for (std::string line; head.get() == '\n' && std::getline(head, line, '\r');)
+            message.headers[core::foldName(line.substr(0, line.find(':')))] =
+                line.substr(line.find(": ") + 2);
+        whole = end + 4 + std::stoul("0" + message.header("Content-Length").substr(0, 9));
+        if (message.header("Content-Length") == "(none)") return message;
+    }
+    message.body = bytes.substr(bytes.find("\r\n\r\n") + 4);
+    return message;
+}
+
+/// All that some listener insists on.
+std::string problemOf(const HttpMessage& message) {
+    const std::array<std::array<const char*, 2>, 10> kExpected = {
+        {{"Content-Type", "application/xml; charset=utf-8"},
+         {"CIMExport", "MethodRequest"},
+         {"CIMExportMethod", "ExportIndication"},
+         {"CIMProtocolVersion", "1.0"},
+         {"Accept", "*/*"},
+         {"Transfer-Encoding", "(none)"},
+         {"Content-Encoding", "(none)"},
+         {"Expect", "(none)"},
+         {"Authorization", "(none)"},
+         {"Proxy-Connection", "(none)"}}};
+    for (const auto& [name, value] : kExpected)
+        if (message.header(name) != value) return std::string(name) + ": " + message.header(name);
+    if (!message.requestLine.starts_with("POST /") || !message.requestLine.ends_with(" HTTP/1.1"))
+        return message.requestLine;
+    if (message.header("Host") == "(none)") return "no Host";
+    return "";
+}
+
+std::string idIn(const std::string& body) {
+    const std::size_t begin = body.find("ID=\"") + 4;
+    return body.substr(begin, body.find('"', begin) - begin);
+}
+
+void sendAll(int connection, const std::string& text) {
+    for (std::size_t sent = 0; sent < text.size();) {
+        const ssize_t count = ::send(connection, text.data() + sent, text.size() - sent, MSG_NOSIGNAL);
+        if (count <= 0) return;
+        sent += static_cast<std::size_t>(count);
+    }
+}
+
+std::string answered(const std::string& id, const std::string& content) {
+    return "<?xml version=\"1.0\" encoding=\"utf-8\" ?><CIM CIMVERSION=\"2.0\" DTDVERSION=\"2.4\"><MESSAGE "
+           "ID=\"" +
+           id + "\" PROTOCOLVERSION=\"1.4\"><SIMPLEEXPRSP><EXPMETHODRESPONSE NAME=\"ExportIndication\">" +
+           content + "</EXPMETHODRESPONSE></SIMPLEEXPRSP></MESSAGE></CIM>";
+}
+
+}  // namespace
+
+StrictListener::StrictListener(std::function<Step(std::size_t)> script)
+    : m_script(std::move(script)), m_socket(::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0)) {
+    sockaddr_in address{};
+    address.sin_family = AF_INET;
+    address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
+    socklen_t length = sizeof address;
+    auto* const any = reinterpret_cast<sockaddr*>(&address);
+    if (::bind(m_socket, any, length) != 0 || ::listen(m_socket, 128) != 0)
+        throw std::runtime_error("no port");
+    ::getsockname(m_socket, any, &length);
+    m_port = ntohs(address.sin_port);
+    m_accepting = std::jthread([this] { accept(); });
+}
+
+StrictListener::~StrictListener() {
+    {
+        const std::lock_guard lock(m_mutex);
+        m_isEnding = true;
+        m_changed.notify_all();
+    }
+    ::shutdown(m_socket, SHUT_RDWR);
+    m_accepting.join();
+    m_threads.clear();
+    ::close(m_socket);
+}
+
+void StrictListener::accept() {
+    while (true) {
+        const int connection = ::accept4(m_socket, nullptr, nullptr, SOCK_CLOEXEC);
+        if (connection < 0) return;
+        m_threads.emplace_back([this, connection] {
+            serve(connection);
+            ::close(connection);
+        });
+    }
+}
+
+void StrictListener::serve(int connection) {
+    const HttpMessage message = readMessage(connection);
+    if (message.requestLine.empty()) return;
+    std::size_t number = 0;
+    {
+        const std::lock_guard lock(m_mutex);
+        number = m_bodies.size();
+        m_bodies.push_back(message.body);
+        const std::string problem = problemOf(message);
+        if (!problem.empty()) m_problems.push_back(problem);
+    }
+    answer(connection, m_script(number), message.body);
+    m_changed.notify_all();
+}
+
+void StrictListener::answer(int connection, const Step& step, const std::string& body) {
+    std::string content;
+    std::string headers = "CIMExport: MethodResponse\r\nContent-Type: text/xml; charset=utf-8\r\n";
+    switch (step.answer) {
+        case Answer::Taken:
+            content = answered(idIn(body), "<IRETURNVALUE></IRETURNVALUE>");
+            break;
+        case Answer::Error:
+            content = answered(idIn(body), "<ERROR CODE=\"1\" DESCRIPTION=\"the queue is full\"/>");
+            break;
+        case Answer::Nonsense:
+            content = "<html>All is well.</html>";
+            break;
+        case Answer::Redirect:
+            headers += "Location: " + url("/elsewhere") + "\r\n";
+            break;
+        case Answer::Endless:
+            content.assign(1 << 20, 'x');
+            break;
+        case Answer::Nothing: {
+            const linger reset{1, 0};
+            ::setsockopt(connection, SOL_SOCKET, SO_LINGER, &reset, sizeof reset);
+            return;
+        }
+        case Answer::Never: {
+            std::unique_lock lock(m_mutex);
+            m_changed.notify_all();
+            m_changed.wait(lock, [this] { return m_isEnding; });
+            return;
+        }
+    }
+    sendAll(connection, "HTTP/1.1 " + std::to_string(step.status) + " Whatever\r\n" + headers +
+                            "Content-Length: " + std::to_string(content.size()) + "\r\n\r\n" + content);
+}
+
+std::vector<std::string> StrictListener::waitFor(std::size_t count) {
+    std::unique_lock lock(m_mutex);
+    m_changed.wait_for(lock, std::chrono::seconds(60), [&] { return m_bodies.size() >= count; });
+    return m_bodies;
+}
+
+std::vector<std::string> StrictListener::problems() {
+    const std::lock_guard lock(m_mutex);
+    return m_problems;
+}
+
+}  // namespace test
