@@ -9,6 +9,8 @@
 #include "Framework/Model/CimError.h"
 #include "Indications/Delivery/Destination.h"
 #include "Indications/StrictListener.h"
+#include "Support/Program.h"
+#include "Support/TempFolder.h"
 #include "Utils/Os/Linux/Thread.h"
 
 namespace {
@@ -166,6 +168,47 @@ TEST(DeliveryTest, ConnectsToNoAddressThatThePolicyForbids) {
         EXPECT_EQ(settled(delivery, name, 1).givenUp, 1U) << spelling;
     }
     EXPECT_EQ(listener.waitFor(0).size(), 0U);
+}
+
+/// A file with a key and its own certificate for the name, for two days.
+std::string certificateFor(const test::TempFolder& folder, const std::string& name) {
+    const std::string file = folder / "listener.pem";
+    const test::ProgramResult made = test::run(
+        {"/bin/sh", "-c",
+         "openssl req -x509 -newkey ec -pkeyopt ec_paramgen_curve:prime256v1 -nodes -keyout $0 -out $0.crt "
+         "-days 2 -subj /CN=listener -addext subjectAltName=$1 && cat $0.crt >> $0",
+         file, name});
+    EXPECT_EQ(made.status, 0) << made.error;
+    return file;
+}
+
+TEST(DeliveryTest, TrustsCertificatesThatAnAuthorityKnowsUnderTheNameOfTheListener) {
+    const struct {
+        const char* name;
+        bool isKnown;
+        bool isVerified;
+        bool isTaken;
+    } cases[] = {
+        {"IP:127.0.0.1", true, true, true},
+        {"IP:127.0.0.1", false, true, false},
+        {"IP:127.0.0.2", true, true, false},
+        {"IP:127.0.0.2", false, false, true},
+    };
+    for (const auto& each : cases) {
+        const test::TempFolder folder;
+        const std::string pem = certificateFor(folder, each.name);
+        StrictListener listener([](std::size_t) { return Step(); }, pem);
+        DeliverySettings settings = quick();
+        settings.wholeTime = std::chrono::seconds(5);
+        settings.retries = 0;
+        settings.verifies = each.isVerified;
+        if (each.isKnown) settings.certificates = pem + ".crt";
+        Delivery delivery(settings);
+        delivery.add("d", listener.url(), toLoopback(), "c");
+        delivery.send("d", 1, numbered);
+        EXPECT_EQ(settled(delivery, "d", 1).delivered, each.isTaken ? 1U : 0U) << each.name << each.isKnown;
+        EXPECT_EQ(listener.waitFor(0).size(), each.isTaken ? 1U : 0U);
+    }
 }
 
 TEST(DeliveryTest, TakesUrlsOfListenersOnly) {

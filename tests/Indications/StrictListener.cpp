@@ -28,13 +28,14 @@ struct HttpMessage {
     }
 };
 
-HttpMessage readMessage(int connection) {
+template <class Channel>
+HttpMessage readMessage(Channel& channel) {
     std::string bytes;
     std::array<char, 4096> buffer{};
     std::size_t whole = std::string::npos;
     HttpMessage message;
     while (bytes.size() < whole) {
-        const ssize_t count = ::recv(connection, buffer.data(), buffer.size(), 0);
+        const ssize_t count = channel.receive(buffer.data(), buffer.size());
         if (count <= 0) return {};
         bytes.append(buffer.data(), static_cast<std::size_t>(count));
         const std::size_t end = bytes.find("\r\n\r\n");
@@ -77,14 +78,6 @@ std::string idIn(const std::string& body) {
     return body.substr(begin, body.find('"', begin) - begin);
 }
 
-void sendAll(int connection, const std::string& text) {
-    for (std::size_t sent = 0; sent < text.size();) {
-        const ssize_t count = ::send(connection, text.data() + sent, text.size() - sent, MSG_NOSIGNAL);
-        if (count <= 0) return;
-        sent += static_cast<std::size_t>(count);
-    }
-}
-
 std::string answered(const std::string& id, const std::string& content) {
     return "<?xml version=\"1.0\" encoding=\"utf-8\" ?><CIM CIMVERSION=\"2.0\" DTDVERSION=\"2.4\"><MESSAGE "
            "ID=\"" +
@@ -94,8 +87,59 @@ std::string answered(const std::string& id, const std::string& content) {
 
 }  // namespace
 
-StrictListener::StrictListener(std::function<Step(std::size_t)> script)
+/// A connection, with TLS or without.
+class StrictListener::Channel {
+  public:
+    Channel(int connection, gnutls_certificate_credentials_t credentials) : m_connection(connection) {
+        if (credentials == nullptr) return;
+        ::gnutls_init(&m_session, GNUTLS_SERVER | GNUTLS_NO_SIGNAL);
+        ::gnutls_set_default_priority(m_session);
+        ::gnutls_credentials_set(m_session, GNUTLS_CRD_CERTIFICATE, credentials);
+        ::gnutls_transport_set_int(m_session, connection);
+        ::gnutls_handshake_set_timeout(m_session, 5000);
+        m_isOpen = ::gnutls_handshake(m_session) == GNUTLS_E_SUCCESS;
+    }
+    Channel(const Channel&) = delete;
+    Channel& operator=(const Channel&) = delete;
+    ~Channel() {
+        if (m_session != nullptr) ::gnutls_deinit(m_session);
+        ::close(m_connection);
+    }
+
+    ssize_t receive(char* bytes, std::size_t most) {
+        if (!m_isOpen) return 0;
+        return m_session == nullptr ? ::recv(m_connection, bytes, most, 0)
+                                    : ::gnutls_record_recv(m_session, bytes, most);
+    }
+    void send(const std::string& text) {
+        for (std::size_t sent = 0; sent < text.size();) {
+            const char* const rest = text.data() + sent;
+            const ssize_t count = m_session == nullptr
+                                      ? ::send(m_connection, rest, text.size() - sent, MSG_NOSIGNAL)
+                                      : ::gnutls_record_send(m_session, rest, text.size() - sent);
+            if (count <= 0) return;
+            sent += static_cast<std::size_t>(count);
+        }
+    }
+    void resetAtEnd() {
+        const linger reset{1, 0};
+        ::setsockopt(m_connection, SOL_SOCKET, SO_LINGER, &reset, sizeof reset);
+    }
+
+  private:
+    const int m_connection;
+    gnutls_session_t m_session = nullptr;
+    bool m_isOpen = true;
+};
+
+StrictListener::StrictListener(std::function<Step(std::size_t)> script, const std::string& pem)
     : m_script(std::move(script)), m_socket(::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0)) {
+    if (!pem.empty()) {
+        ::gnutls_certificate_allocate_credentials(&m_credentials);
+        const int status = ::gnutls_certificate_set_x509_key_file(m_credentials, pem.c_str(), pem.c_str(),
+                                                                  GNUTLS_X509_FMT_PEM);
+        if (status < 0) throw std::runtime_error(::gnutls_strerror(status));
+    }
     sockaddr_in address{};
     address.sin_family = AF_INET;
     address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
@@ -118,21 +162,20 @@ StrictListener::~StrictListener() {
     m_accepting.join();
     m_threads.clear();
     ::close(m_socket);
+    if (m_credentials != nullptr) ::gnutls_certificate_free_credentials(m_credentials);
 }
 
 void StrictListener::accept() {
     while (true) {
         const int connection = ::accept4(m_socket, nullptr, nullptr, SOCK_CLOEXEC);
         if (connection < 0) return;
-        m_threads.emplace_back([this, connection] {
-            serve(connection);
-            ::close(connection);
-        });
+        m_threads.emplace_back([this, connection] { serve(connection); });
     }
 }
 
 void StrictListener::serve(int connection) {
-    const HttpMessage message = readMessage(connection);
+    Channel channel(connection, m_credentials);
+    const HttpMessage message = readMessage(channel);
     if (message.requestLine.empty()) return;
     std::size_t number = 0;
     {
@@ -142,11 +185,11 @@ void StrictListener::serve(int connection) {
         const std::string problem = problemOf(message);
         if (!problem.empty()) m_problems.push_back(problem);
     }
-    answer(connection, m_script(number), message.body);
+    answer(channel, m_script(number), message.body);
     m_changed.notify_all();
 }
 
-void StrictListener::answer(int connection, const Step& step, const std::string& body) {
+void StrictListener::answer(Channel& channel, const Step& step, const std::string& body) {
     std::string content;
     std::string headers = "CIMExport: MethodResponse\r\nContent-Type: text/xml; charset=utf-8\r\n";
     switch (step.answer) {
@@ -165,11 +208,9 @@ void StrictListener::answer(int connection, const Step& step, const std::string&
         case Answer::Endless:
             content.assign(1 << 20, 'x');
             break;
-        case Answer::Nothing: {
-            const linger reset{1, 0};
-            ::setsockopt(connection, SOL_SOCKET, SO_LINGER, &reset, sizeof reset);
+        case Answer::Nothing:
+            channel.resetAtEnd();
             return;
-        }
         case Answer::Never: {
             std::unique_lock lock(m_mutex);
             m_changed.notify_all();
@@ -177,8 +218,8 @@ void StrictListener::answer(int connection, const Step& step, const std::string&
             return;
         }
     }
-    sendAll(connection, "HTTP/1.1 " + std::to_string(step.status) + " Whatever\r\n" + headers +
-                            "Content-Length: " + std::to_string(content.size()) + "\r\n\r\n" + content);
+    channel.send("HTTP/1.1 " + std::to_string(step.status) + " Whatever\r\n" + headers +
+                 "Content-Length: " + std::to_string(content.size()) + "\r\n\r\n" + content);
 }
 
 std::vector<std::string> StrictListener::waitFor(std::size_t count) {

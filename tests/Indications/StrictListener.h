@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include <gnutls/gnutls.h>
+
 #include <condition_variable>
 #include <functional>
 #include <mutex>
@@ -23,8 +25,11 @@ class StrictListener {
     using Answer = ListenerAnswer;
     using Step = ListenerStep;
 
-    /// What to answer to the message of this number, from 0; called on threads of the listener.
-    explicit StrictListener(std::function<Step(std::size_t)> script = [](std::size_t) { return Step(); });
+    /// @param script  what to answer to the message of this number, from 0; called on threads of the listener
+    /// @param pem     a file with key and certificate, to take nothing but TLS; empty for no TLS
+    explicit StrictListener(
+        std::function<Step(std::size_t)> script = [](std::size_t) { return Step(); },
+        const std::string& pem = {});
     /// Waits for those that connect, and lets go of those that it keeps waiting.
     ~StrictListener();
     StrictListener(const StrictListener&) = delete;
@@ -32,7 +37,8 @@ class StrictListener {
 
     int port() const { return m_port; }
     std::string url(const std::string& path = "/CIMListener/a") const {
-        return "http://127.0.0.1:" + std::to_string(m_port) + path;
+        return (m_credentials == nullptr ? "http" : "https") + ("://127.0.0.1:" + std::to_string(m_port)) +
+               path;
     }
 
     /// The bodies that have come, when there are so many.
@@ -41,11 +47,14 @@ class StrictListener {
     std::vector<std::string> problems();
 
   private:
+    class Channel;
+
     void accept();
     void serve(int connection);
-    void answer(int connection, const Step& step, const std::string& body);
+    void answer(Channel& channel, const Step& step, const std::string& body);
 
     const std::function<Step(std::size_t)> m_script;
+    gnutls_certificate_credentials_t m_credentials = nullptr;
     int m_socket;
     int m_port = 0;
     std::mutex m_mutex;

@@ -2,9 +2,12 @@
 #include "Framework/Events/EventTable.h"
 
 #include <algorithm>
+#include <array>
 #include <chrono>
 #include <condition_variable>
+#include <cstddef>
 #include <mutex>
+#include <new>
 
 #include "Framework/Events/EventSource.h"
 #include "Framework/Model/CimType.h"
@@ -64,8 +67,10 @@ EventTable::EventTable() = default;
 
 EventTable::~EventTable() = default;
 
-EventTable& EventTable::theOne() {
-    static auto* const table = new EventTable;
+EventTable& EventTable::theOne() noexcept {
+    // Not from the heap: instances leave the table where there is no memory, too.
+    alignas(EventTable) static std::array<std::byte, sizeof(EventTable)> place;
+    static auto* const table = new (place.data()) EventTable;
     return *table;
 }
 

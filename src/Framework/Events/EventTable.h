@@ -18,7 +18,7 @@ class EventSource;
 class EventTable {
   public:
     /// Never destroyed: instances leave it until the end of the process.
-    static EventTable& theOne();
+    static EventTable& theOne() noexcept;
 
     bool isWanted(std::string_view className) const noexcept;
 
