@@ -424,7 +424,7 @@ TEST_F(CardVerbTest, WritesToManyOnlyWhatIsKnownToBeNew) {
         {opaque, "None", 0, false, true, "updated", ExitStatus::Done, true},
         {older, "None", 4099, false, false, "refused", ExitStatus::Failed, true},
         {foreign, "None", 4097, false, false, "refused", ExitStatus::Failed, true},
-        {foreign, "None", 4097, true, false, "fits no adapter here", ExitStatus::AlreadyCurrent, false},
+        {foreign, "None", 4097, true, false, "fits no adapter here", ExitStatus::NotFound, false},
     };
     m_answer = "y";
     for (const Row& row : table) {

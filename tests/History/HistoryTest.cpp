@@ -98,10 +98,10 @@ TEST_F(HistoryTest, KeepsARefusalAndAnUpdateForThisUserAlone) {
 TEST_F(HistoryTest, TakesNothingFromTheRecordBefore) {
     {
         History history(settings());
-        history.refused(attempt(), 5, "it was wrong");
+        history.refused(attempt(), 5, core::ReasonId::ImageDamaged, "it was wrong");
         core::UpdateAttempt bare;
         bare.mostRecords = attempt().mostRecords;
-        history.refused(bare, 0, "");
+        history.refused(bare, 0, core::ReasonId::None, "");
     }
     const std::vector<Record> found = records();
     ASSERT_EQ(found.size(), 2U);

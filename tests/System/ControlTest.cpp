@@ -139,7 +139,10 @@ TEST_F(ControlTest, RefusesWhatIsNoUpload) {
         std::string what, place, sum, body, login, text;
         int status;
         std::size_t more = 0;
-    } rows[] = {{"wrong sum", sum + "/a", sumOf("y"), body, kAdmin, "did not arrive as it was sent", 422},
+    } rows[] = {{"wrong sum", sumOf("y") + "/a", sumOf("y"), body, kAdmin, "did not arrive as it was sent",
+                 422},
+                {"another image under its sum", sumOf("y") + "/a", sum, body, kAdmin,
+                 "which is not the one in the path", 400},
                 {"no sum", sum + "/a", "5", body, kAdmin, "has to hold the SHA-256", 400},
                 {"a name with a slash", sum + "/../a", sum, body, kAdmin, "is no name for an image", 400},
                 {"the same, hidden", sum + "/..%2Fa", sum, body, kAdmin, "is no name for an image", 400},

@@ -35,6 +35,8 @@ bool hasChangedNothing(const Record& record) {
 /// Whether the later update found what the earlier one had left: not where another one wrote some types in
 /// between. What nobody has seen run says nothing of it, since the later one names what ran.
 bool isBefore(const Record& earlier, const Record& later) {
+    // Of some types only, and the later one wrote others besides: of those nobody knows what was there.
+    if (!earlier.optionValues.empty() && earlier.optionValues != later.optionValues) return false;
     const bool isTelling = earlier.active && !earlier.versionsAfter.empty() && !later.versionsBefore.empty();
     return !isTelling || earlier.versionsAfter == later.versionsBefore;
 }
