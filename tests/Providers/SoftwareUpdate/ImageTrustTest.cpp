@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Providers/SoftwareUpdate/ImageTrust.h"
 
+#include <atomic>
 #include <filesystem>
 #include <functional>
 
@@ -55,9 +56,9 @@ TEST_F(ImageTrustTest, WithoutAVerifierNothingIsTrusted) {
 
 TEST_F(ImageTrustTest, TheVerdictDecidesBeforeTheAdapterIsAsked) {
     Verifier verifier;
-    bool isAsked = false;
+    std::atomic<bool> isAsked = false;  // the worker of a job asks the adapter, too
     m_backend->hook = [&](const std::string& operation) {
-        isAsked = isAsked || operation == "prepareFlashImage";
+        if (operation == "prepareFlashImage") isAsked = true;
     };
     verifier.verdict = {.reason = ReasonId::SignatureWrong, .text = "it was forged"};
     expectRefused(ReasonId::SignatureWrong, "it was forged");
@@ -65,6 +66,7 @@ TEST_F(ImageTrustTest, TheVerdictDecidesBeforeTheAdapterIsAsked) {
     verifier.verdict = {.key = "vendor"};
     expectUpdateWorks();
     EXPECT_TRUE(isAsked);
+    m_backend->hook = nullptr;
 }
 
 // Whoever may write to the folder exchanges the file as soon as it was found good.
