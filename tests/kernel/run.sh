@@ -33,7 +33,7 @@ ln -s ../run "$root/var/"
 DESTDIR="$root" cmake --install build/release --prefix /usr/local --strip >"$place/install.log"
 tools=(/lib/systemd/systemd)
 for tool in busybox devlink setpriv systemctl systemd-tmpfiles wbemcli; do tools+=("$(command -v "$tool")"); done
-tools+=("$(ldconfig -p | awk '$1 == "libcurl.so.4" && /x86-64/ { print $NF; exit }')") # quenxctl loads it for a server
+tools+=("$(ldconfig -p | awk '$1 == "libcurl.so.4" && /x86-64/ && !found++ { print $NF }')") # quenxctl loads it for a server
 bring "${tools[@]}" /lib/systemd/system/{basic,network-online,shutdown,sysinit}.target
 bring_libraries_of "${tools[@]}" "$root"/usr/local/{bin/quenxctl,sbin/quenx-cimd,lib/quenx/*.so}
 cp "$kernel"/*.ko tests/kernel/guest/{init,tests.sh} "$root/"
