@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 // Every cause for which an update is refused or fails is met, and told by its id.
 #include <filesystem>
+#include <map>
 #include <set>
 #include <thread>
 
@@ -19,13 +20,17 @@ using core::ReasonId;
 class ExhaustedSink : public core::UpdateSink {
   public:
     std::future<core::ImageFacts> examine(std::span<const std::uint8_t>) noexcept override { return {}; }
-    void refused(const core::UpdateAttempt&, unsigned int, core::ReasonId id,
+    void refused(const core::UpdateAttempt& attempt, unsigned int, core::ReasonId id,
                  const std::string& text) noexcept override {
-        EXPECT_EQ(id, ReasonId::NoMemory);
-        EXPECT_EQ(text, "There was not enough memory");
+        EXPECT_FALSE(attempt.uri.empty());
+        told[id] = text;
+        denials += id == ReasonId::PolicyUnreadable ? 1 : 0;
     }
     std::string problem() override { throw std::bad_alloc(); }
     std::shared_ptr<core::UpdateRecord> begin(const core::UpdateAttempt&) noexcept override { return {}; }
+
+    std::map<ReasonId, std::string> told;
+    int denials = 0;
 };
 
 class RefusalsTest : public test::UpdateTest {
@@ -153,12 +158,20 @@ void RefusalsTest::expectOfThePolicy() {
     const std::string file = m_folder.write("policy.toml", "history = \"required\"\n");
     const utils::PolicyFile policy(file);
     expectRefused(ReasonId::HistoryRequired);
-    const core::InstalledSink sink(std::make_shared<ExhaustedSink>());
+    const auto told = std::make_shared<ExhaustedSink>();
+    const core::InstalledSink sink(told);
     expectRefused(ReasonId::NoMemory);
     m_folder.write("policy.toml", "administrators = [\"alice\"]\n");
     expectRefused(ReasonId::NotAdministrator);
     m_folder.write("policy.toml", "administrator = 1\n");
     expectRefused(ReasonId::PolicyUnreadable);
+    EXPECT_EQ(told->told[ReasonId::NoMemory], "There was not enough memory");
+    EXPECT_NE(told->told[ReasonId::NotAdministrator].find("may only read"), std::string::npos);
+    EXPECT_NE(told->told[ReasonId::PolicyUnreadable].find("unknown key"), std::string::npos);
+    // Who may only read cannot fill a history.
+    for (int i = 0; i < 20; ++i)
+        static_cast<void>(install(m_uri, m_port));
+    EXPECT_LE(told->denials, 10);
 }
 
 void RefusalsTest::expectOfTheFlash() {

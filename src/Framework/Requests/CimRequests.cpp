@@ -11,6 +11,8 @@
 #include "Framework/Model/CimInstance.h"
 #include "Framework/Model/CimPropertyList.h"
 #include "Framework/Requests/AnswerMeter.h"
+#include "Framework/Requests/DeniedUpdates.h"
+#include "Framework/Requests/NotedCall.h"
 #include "Framework/Requests/PolicyDecision.h"
 #include "Framework/Requests/ServedClasses.h"
 #include "Utils/Exception.h"
@@ -126,6 +128,17 @@ unsigned int call(CimInstance& instance, const std::string& method, CallLists& l
     }
 }
 
+/// The decision of one who may call; one who may not is told of as well.
+PolicyDecision requireLeave(const std::string& method, const std::vector<Argument>& arguments) {
+    const NotedCall noted;
+    try {
+        return PolicyDecision();
+    } catch (const CimError& denied) {
+        tellOfDenied(method, arguments, noted.notes().reason, denied.what());
+        throw;
+    }
+}
+
 }  // namespace
 
 CimRequests::CimRequests(std::string namespaceName) : m_namespace(std::move(namespaceName)) {}
@@ -201,7 +214,7 @@ MethodResult CimRequests::invokeMethod(const CimPath& path, const std::string& m
                                        const std::vector<Argument>& arguments) {
     return answerRequest(m_namespace, [&](const ServedClasses& classes) -> MethodResult {
         // Before anything else: one who may not learns nothing of what there is to call.
-        const PolicyDecision decision;
+        const PolicyDecision decision = requireLeave(method, arguments);
         const ClassChain chain = classes.chainOf(path.getClassName());
         // Not InvalidClass, which DSP0200 does not list for extrinsic methods.
         if (chain.empty()) {

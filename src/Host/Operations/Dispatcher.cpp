@@ -8,6 +8,7 @@
 #include "CimXml/InstanceStream.h"
 #include "Framework/Requests/Audit.h"
 #include "Framework/Requests/Caller.h"
+#include "Framework/Requests/DeniedUpdates.h"
 
 namespace host {
 
@@ -90,7 +91,12 @@ IntrinsicResult Dispatcher::callOperation(const cimxml::IntrinsicCall& call, con
 
 core::MethodResult Dispatcher::callMethod(const cimxml::MethodCall& call, const Caller& caller) {
     // Before anything else, so that a reader learns nothing of what there is to call.
-    requirePrivilege(kMethodPrivilege, caller);
+    try {
+        requirePrivilege(kMethodPrivilege, caller);
+    } catch (const CimError& denied) {
+        core::tellOfDenied(call.method, call.arguments, core::ReasonId::NotAdministrator, denied.what());
+        throw;
+    }
     core::CimOperations& target = findNamespace(call.object.getNamespace());
     if (!call.mistypedArgument.empty()) {
         throw CimError(CimStatus::InvalidParameter,
