@@ -10,7 +10,7 @@
 #include "History/Look.h"
 #include "History/Store.h"
 #include "Utils/Os/Linux/OwnFiles.h"
-#include "Utils/Os/Linux/linux.h"
+#include "Utils/Os/Linux/PatientReading.h"
 #include "Utils/Utils.h"
 
 namespace history {
@@ -19,16 +19,16 @@ namespace fs = std::filesystem;
 
 namespace {
 
-/// The bytes of the file where they have the sum.
-std::optional<std::vector<std::uint8_t>> contentOf(const std::string& path, const std::string& sha256,
-                                                   std::int64_t bytes) {
-    std::error_code error;
-    const auto size = static_cast<std::uint64_t>(bytes);
-    if (sha256.empty() || !fs::is_regular_file(path, error) || fs::file_size(path, error) != size)
-        return std::nullopt;
-    auto content = os::readWholeFile(path, size);
-    if (!content || factsOf(*content).sha256 != sha256) return std::nullopt;
-    return content;
+/// The file where its bytes have the sum. Its file system may hang, which must hold up no record.
+std::optional<os::FileLook> contentOf(const std::string& path, const std::string& sha256,
+                                      std::int64_t bytes) {
+    if (sha256.empty()) return std::nullopt;
+    os::Patience patience;
+    std::optional<os::FileLook> file = os::lookAtFile(path, bytes, patience);
+    const bool isWhole = file && file->kind == os::FileKind::Regular && file->size == bytes &&
+                         file->count == static_cast<std::size_t>(bytes);
+    if (!isWhole || factsOf({file->bytes.get(), file->count}).sha256 != sha256) return std::nullopt;
+    return file;
 }
 
 /// The path in a file URI.
@@ -55,12 +55,12 @@ void keepImage(const std::string& folder, const std::string& model, const Record
     if (!content) throw std::runtime_error(record.uri + " is no longer the file that was written");
     std::string prefix = model + "-";
     utils::replaceCharacter(prefix, ':', '-');
-    const std::string place = openFolder(folder);
+    os::makeOwnFolder(folder);
     // One that is there is written again, and so becomes the newest.
     constexpr mode_t kOwnersAlone = 0600;
-    os::replaceFile(place + "/" + prefix + record.sha256,
-                    {reinterpret_cast<const char*>(content->data()), content->size()}, kOwnersAlone);
-    removeOldest(place, prefix);
+    os::replaceFile(folder + "/" + prefix + record.sha256,
+                    {reinterpret_cast<const char*>(content->bytes.get()), content->count}, kOwnersAlone);
+    removeOldest(folder, prefix);
 }
 
 bool hasSum(const std::string& path, const std::string& sha256, std::int64_t bytes) try {

@@ -109,7 +109,12 @@ TEST(SpoolTest, RemovesWhatAKilledDaemonHasLeftOfAnUpload) {
         fs::create_directory(folder / name);
     folder.write("images/.part-x", "half");
     folder.write("images/a/new.rom", "whole");
-    const host::Spool spool({.directory = folder / "images"});
+    const host::UploadSettings settings{.directory = folder / "images"};
+    EXPECT_THAT([&] { const host::Spool spool(settings); },
+                ThrowsMessage<std::runtime_error>(HasSubstr("run: chmod 700 " + settings.directory)))
+        << "others may need it as it is";
+    fs::permissions(settings.directory, fs::perms(0700));
+    const host::Spool spool(settings);
     EXPECT_FALSE(fs::exists(folder / "images/.part-x"));
     EXPECT_TRUE(fs::exists(folder / "images/a/new.rom"));
 }
@@ -157,7 +162,7 @@ TEST(LocalSocketTest, ReplacesWhatAKilledDaemonLeftAndNothingElse) {
     const test::UnixSocket foreign(SOCK_STREAM, folder / "other");
     fs::create_symlink(folder / "other", path);
     EXPECT_THAT([&] { const LocalSocket socket(path); },
-                ThrowsMessage<host::ListenError>(HasSubstr("there is a file that is no socket")));
+                ThrowsMessage<host::ListenError>(HasSubstr("there is a file that is not a socket")));
     EXPECT_TRUE(fs::is_symlink(path));
 }
 

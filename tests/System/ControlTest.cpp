@@ -139,21 +139,24 @@ TEST_F(ControlTest, RefusesWhatIsNoUpload) {
         std::string what, place, sum, body, login, text;
         int status;
         std::size_t more = 0;
-    } rows[] = {{"wrong sum", sumOf("y") + "/a", sumOf("y"), body, kAdmin, "did not arrive as it was sent",
-                 422},
-                {"another image under its sum", sumOf("y") + "/a", sum, body, kAdmin,
-                 "which is not the one in the path", 400},
-                {"no sum", sum + "/a", "5", body, kAdmin, "has to hold the SHA-256", 400},
-                {"a name with a slash", sum + "/../a", sum, body, kAdmin, "is no name for an image", 400},
-                {"the same, hidden", sum + "/..%2Fa", sum, body, kAdmin, "is no name for an image", 400},
-                {"a hidden file", sum + "/.a", sum, body, kAdmin, "is no name for an image", 400},
-                {"no folder", "a", sum, body, kAdmin, "a slash and its name", 400},
-                {"too large", sum + "/a", sum, std::string(200001, 'x'), kAdmin, "uploads.image_bytes", 413},
-                {"empty", sum + "/a", sum, "", kAdmin, "is empty", 400},
-                {"not an administrator", sum + "/a", sum, body, kGuest, "may only read", 403},
-                {"nobody", sum + "/a", sum, body, "X: y", "", 401},
-                {"cut off", sum + "/a", sum, body, kAdmin, "", 0, 1}};
-    std::filesystem::create_directory(m_daemon.folder() / "images");
+    } rows[] = {
+        {"wrong sum", sumOf("y") + "/a", sumOf("y"), body, kAdmin, "did not arrive as it was sent", 422},
+        {"another image under its sum", sumOf("y") + "/a", sum, body, kAdmin,
+         "which is not the one in the path", 400},
+        {"no sum", sum + "/a", "5", body, kAdmin, "has to hold the SHA-256", 400},
+        {"a name with a slash", sum + "/../a", sum, body, kAdmin, "cannot be the name of an image", 400},
+        {"the same, hidden", sum + "/..%2Fa", sum, body, kAdmin, "cannot be the name of an image", 400},
+        {"a hidden file", sum + "/.a", sum, body, kAdmin, "cannot be the name of an image", 400},
+        {"no folder", "a", sum, body, kAdmin, "a slash and its name", 400},
+        {"too large", sum + "/a", sum, std::string(200001, 'x'), kAdmin, "uploads.image_bytes", 413},
+        {"empty", sum + "/a", sum, "", kAdmin, "is empty", 400},
+        {"not an administrator", sum + "/a", sum, body, kGuest, "may only read", 403},
+        {"nobody", sum + "/a", sum, body, "X: y", "", 401},
+        {"cut off", sum + "/a", sum, body, kAdmin, "", 0, 1}};
+    const std::string images = m_daemon.folder() / "images";
+    std::filesystem::create_directory(images);
+    EXPECT_EQ(test::statusOf(put(sum + "/a", sum, body)), 500) << "others may need that folder";
+    std::filesystem::permissions(images, std::filesystem::perms(0700));
     for (const auto& row : rows) {
         const std::string answer = put(row.place, row.sum, row.body, row.login, row.more);
         EXPECT_EQ(test::statusOf(answer), row.status) << row.what;

@@ -51,9 +51,10 @@ void requirePlace(const std::string& place) {
     if (slash == std::string::npos || !control::isSha256(place.substr(0, slash)))
         throw ControlRefusal(400, "an image is sent to the SHA-256 of its bytes, a slash and its name");
     if (!isFileName(place.substr(slash + 1)))
-        throw ControlRefusal(400, "\"" + place.substr(slash + 1) +
-                                      "\" is no name for an image; take at most 100 letters, digits, spaces "
-                                      "and ._+-@,~ that do not begin with a dot or a dash, and no slash");
+        throw ControlRefusal(
+            400, "\"" + place.substr(slash + 1) +
+                     "\" cannot be the name of an image; take at most 100 letters, digits, spaces "
+                     "and ._+-@,~ that do not begin with a dot or a dash, and no slash");
 }
 
 std::string imageOf(const std::string& place) {
@@ -63,6 +64,16 @@ std::string imageOf(const std::string& place) {
 bool isCompanion(const std::string& place) {
     return std::ranges::any_of(control::kCompanions,
                                [&](std::string_view ending) { return place.ends_with(ending); });
+}
+
+void makeFolder(const std::string& folder) {
+    try {
+        os::makeOwnFolder(folder);
+    } catch (const std::system_error& error) {
+        refuseStoring(error.code().value(), folder);
+    } catch (const std::runtime_error& error) {
+        throw ControlRefusal(500, std::string("the file cannot be stored: ") + error.what());
+    }
 }
 
 /// An image with what belongs to it.
@@ -102,7 +113,8 @@ UploadSettings placed(UploadSettings settings) {
 }  // namespace
 
 Spool::Spool(const UploadSettings& settings) : m_settings(placed(settings)) {
-    if (folder().empty() || !os::closeFolderToOthers(folder())) return;
+    if (folder().empty() || !fs::exists(fs::symlink_status(folder()))) return;
+    os::makeOwnFolder(folder());
     for (const auto& entry : fs::directory_iterator(folder())) {
         if (!entry.path().filename().string().starts_with(kPart)) continue;
         std::error_code error;
@@ -170,10 +182,7 @@ std::unique_ptr<Upload> Spool::begin(const std::string& place, std::uint64_t siz
         throw ControlRefusal(413, "the file has " + std::to_string(size) + " bytes, more than the " +
                                       std::to_string(m_settings.imageBytes) +
                                       " that uploads.image_bytes allows");
-    std::error_code error;
-    fs::create_directories(m_settings.directory, error);
-    if (error) refuseStoring(error.value(), m_settings.directory);
-    os::closeFolderToOthers(m_settings.directory);
+    makeFolder(m_settings.directory);
     {
         const utils::Mutex::AutoLocker lock(m_mutex);
         reserve(size, place);

@@ -73,7 +73,7 @@ bool isLeftOver(const std::string& path) {
         if (errno != ENOENT) refuse(path, errno);
         return false;
     }
-    if (!S_ISSOCK(status.st_mode)) refuse(path, EEXIST, "there is a file that is no socket");
+    if (!S_ISSOCK(status.st_mode)) refuse(path, EEXIST, "there is a file that is not a socket");
     const int error = connectTo(path);
     if (error == ECONNREFUSED) return true;
     if (error == 0 || error == EAGAIN) refuse(path, EADDRINUSE, "another process listens there");

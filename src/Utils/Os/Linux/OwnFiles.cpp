@@ -80,16 +80,38 @@ bool closeToOthers(int descriptor) noexcept {
     return fchmod(descriptor, S_ISDIR(status.st_mode) ? S_IRWXU : S_IRUSR | S_IWUSR) == 0;
 }
 
-bool closeFolderToOthers(const std::string& path) {
+namespace {
+
+/// A folder of this user's that nobody else can exchange. Not open where there is none.
+Descriptor openOwnFolder(const std::string& path, struct stat& status) {
     const std::string purpose = "cannot use the folder";
-    const Descriptor folder(::open(path.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC | O_NOFOLLOW));
-    if (!folder.isOpen() && errno == ENOENT) return false;
-    struct stat status {};
+    Descriptor folder(::open(path.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC | O_NOFOLLOW));
+    if (!folder.isOpen() && errno == ENOENT) return folder;
     if (!folder.isOpen() || ::fstat(folder.number(), &status) != 0) fail(errno, purpose + " " + path);
     if (status.st_uid != ::geteuid()) throw ForeignFile(path, status.st_uid, purpose);
     requireSafePlace(folder, path, purpose);
-    if (!closeToOthers(folder.number())) fail(errno, "cannot protect the folder " + path);
-    return true;
+    return folder;
+}
+
+}  // namespace
+
+bool closeFolderToOthers(const std::string& path) {
+    struct stat status {};
+    const Descriptor folder = openOwnFolder(path, status);
+    if (folder.isOpen() && !closeToOthers(folder.number())) fail(errno, "cannot protect the folder " + path);
+    return folder.isOpen();
+}
+
+void makeOwnFolder(const std::string& path) {
+    const std::filesystem::path asked(path);
+    std::filesystem::create_directories(asked.parent_path());
+    if (::mkdir(path.c_str(), S_IRWXU) != 0 && errno != EEXIST) fail(errno, "cannot make the folder " + path);
+    struct stat status {};
+    const Descriptor folder = openOwnFolder(path, status);
+    if ((status.st_mode & (S_IRWXG | S_IRWXO)) != 0)
+        throw std::runtime_error("cannot use the folder " + path +
+                                 ": others may look into it; run: chmod 700 " + path +
+                                 ", or name another folder");
 }
 
 std::string whoElseMayChange(const Descriptor& opened, const std::string& path) {

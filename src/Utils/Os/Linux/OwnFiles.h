@@ -41,6 +41,11 @@ QUENX_EXPORT bool closeToOthers(int descriptor) noexcept;
 /// (std::runtime_error). False when there is none.
 QUENX_EXPORT bool closeFolderToOthers(const std::string& path);
 
+/// Makes a folder that is this user's alone, and those above it, or takes one that is there, unless others
+/// may look into it: they may need it as it is. Refused as above, and with what would be right
+/// (std::runtime_error).
+QUENX_EXPORT void makeOwnFolder(const std::string& path);
+
 /// How others than root and this user could change an open file or folder, and what ends that: "belongs to
 /// user 5, who could change it; run: chown root PATH". Empty where they cannot.
 /// @param path  for the text
