@@ -105,6 +105,13 @@ class History::Update : public core::UpdateRecord {
             finishAs(kFailed, core::reasonOfErrorCode(code), code, text);
     }
 
+    /// It does not begin. Waits for nothing.
+    void withdraw() {
+        m_hasEnded = true;
+        m_process.writer.run([keeper = m_process.keeper, update = m_update] { keeper->withdraw(update); },
+                             {});
+    }
+
   private:
     void finishAs(const char* outcome, core::ReasonId reason, std::uint32_t code,
                   const std::string& text) noexcept try {
@@ -193,8 +200,9 @@ std::shared_ptr<core::UpdateRecord> History::begin(const core::UpdateAttempt& at
     auto record = std::make_shared<Update>(own, update, attempt.monotonic);
     const auto isKept = std::make_shared<std::atomic<bool>>(false);
     own.writer.run([keeper = own.keeper, update, isKept] { *isKept = keeper->begin(update); }, kPatience);
-    if (attempt.mustBeKept && !*isKept) return nullptr;
-    return record;
+    if (!attempt.mustBeKept || *isKept) return record;
+    record->withdraw();
+    return nullptr;
 } catch (const std::exception&) {
     return nullptr;
 }

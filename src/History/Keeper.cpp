@@ -41,10 +41,11 @@ void completeInterrupted(Record& record) {
     const std::optional<AdapterLook> found = lookAt(record.adapter);
     if (!found) {
         record.reason += " cannot be read now";
+        record.versionsAfter.clear();
         return;
     }
+    record.reason += found->stored == record.versionsAfter ? " still has " : " now has ";
     record.versionsAfter = found->stored;
-    record.reason += found->stored == record.versionsBefore ? " still has " : " now has ";
     record.reason += found->stored.empty() ? "no versions that it tells" : found->stored;
 }
 
@@ -146,6 +147,7 @@ bool Keeper::begin(const std::shared_ptr<RunningUpdate>& update) {
     if (const auto look = lookAt(record.adapter)) {
         identify(record, *look);
         record.versionsBefore = look->running;
+        record.versionsAfter = look->stored;  // until it ends
     }
     m_running.push_back(update);
     return withStore([&](Store& store) {
@@ -154,10 +156,15 @@ bool Keeper::begin(const std::shared_ptr<RunningUpdate>& update) {
     });
 }
 
+void Keeper::withdraw(const std::shared_ptr<RunningUpdate>& update) {
+    std::erase(m_running, update);
+    if (update->record.id != 0) withStore([&](Store& store) { store.remove(update->record); });
+}
+
 void Keeper::end(const std::shared_ptr<RunningUpdate>& update) {
     Record& record = update->record;
     const std::optional<AdapterLook> look = lookAt(record.adapter);
-    if (look && look->isStoredKnown) record.versionsAfter = look->stored;
+    record.versionsAfter = look && look->isStoredKnown ? look->stored : "";
     if (record.outcome == kWritten && look && look->isStoredKnown && look->running == look->stored)
         record.active = record.ended;
     withStore([&](Store& store) {
@@ -248,7 +255,6 @@ std::int64_t Keeper::count() {
 std::vector<Record> Keeper::find(const Filter& filter) {
     std::vector<Record> records;
     if (!isThere()) return records;
-    m_problem.clear();
     const bool isDone = withStore([&](Store& store) {
         completeOfDead(store);
         noteActive(store);

@@ -31,6 +31,8 @@ class Keeper {
     void add(Record record, std::int64_t most);
     /// False when the record could not be written.
     bool begin(const std::shared_ptr<RunningUpdate>& update);
+    /// The update did not begin after all, since its record came too late: it gets one as a refusal.
+    void withdraw(const std::shared_ptr<RunningUpdate>& update);
     /// The record says how it ended, but not yet what the adapter then has.
     void end(const std::shared_ptr<RunningUpdate>& update);
     /// Copies the image of an update that has ended to where it is to be kept.

@@ -216,6 +216,13 @@ void Store::update(const Record& record) {
     statement.step();
 }
 
+void Store::remove(const Record& record) {
+    Statement statement(m_database, "DELETE FROM updates WHERE id = ?1 AND owner = ?2");
+    statement.bind(1, record.id);
+    statement.bind(2, record.owner);
+    statement.step();
+}
+
 bool Store::holds(const Record& record) {
     Statement statement(m_database, "SELECT 1 FROM updates WHERE id = ?1 AND owner = ?2");
     statement.bind(1, record.id);

@@ -48,6 +48,8 @@ class Store {
     Pruned add(Record& record, std::int64_t most);
     /// Puts what is known now in the place of a record of the same owner, unless its update has ended.
     void update(const Record& record);
+    /// Takes away the record of an update that did not begin after all.
+    void remove(const Record& record);
     /// Whether the record of a running update is in this file.
     bool holds(const Record& record);
     void setProgress(std::int64_t id, std::int64_t percent);

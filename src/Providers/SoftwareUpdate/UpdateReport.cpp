@@ -121,7 +121,7 @@ bool UpdateReport::begin(Quenx_ConcreteJob& job) {
     if (current == nullptr) return !mustBeKept;
     core::UpdateAttempt& attempt = current->m_attempt;
     attempt.types = job.getImageTypes();
-    attempt.job = job.getUniqId();
+    attempt.job = "Quenx:" + job.getUniqId();
     attempt.mustBeKept = mustBeKept;
     std::shared_ptr<core::UpdateRecord> record = current->m_sink->begin(attempt);
     if (record == nullptr && mustBeKept) {
