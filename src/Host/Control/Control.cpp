@@ -108,7 +108,23 @@ ControlCall::ControlCall(Control& control, const HttpHead& head, Caller caller)
     });
 }
 
-ControlCall::~ControlCall() = default;
+ControlCall::~ControlCall() {
+    if (m_isAnswered) return;
+    if (!m_refusal) m_outcome = "failed: the client went away before all had come";
+    tell(m_refusal ? m_refusal->status : 0);
+}
+
+void ControlCall::tell(unsigned int status) noexcept try {
+    m_isAnswered = true;
+    if (m_route.privilege != Privilege::Administer) return;
+    const core::AuditEvent event{asker(), m_route.operation, m_target, m_outcome, m_notes};
+    if (status == 403)
+        m_control.m_trail->refused(event, {});
+    else
+        core::audit(event);
+} catch (const std::bad_alloc&) {
+    // As in the rest of the log: a line that cannot be built is dropped.
+}
 
 core::Caller ControlCall::asker() const {
     return {.principal = m_caller.user, .address = m_caller.address, .front = "quenx-cimd"};
@@ -148,13 +164,7 @@ HttpAnswer ControlCall::finish() {
     }
     if (m_refusal) answer = std::move(*m_refusal);
     answer.tellReason(m_notes.reason);
-    if (m_route.privilege == Privilege::Administer) {
-        const core::AuditEvent event{asker(), m_route.operation, m_target, m_outcome, m_notes};
-        if (answer.status == 403)
-            m_control.m_trail->refused(event, {});
-        else
-            core::audit(event);
-    }
+    tell(answer.status);
     return answer;
 }
 

@@ -64,6 +64,8 @@ class ControlCall {
     template <class Work>
     void guarded(Work work);
     core::Caller asker() const;
+    /// Leaves the audit line. Once.
+    void tell(unsigned int status) noexcept;
     HttpAnswer showStatus();
     HttpAnswer checkImage();
     HttpAnswer judgeImages();
@@ -80,6 +82,7 @@ class ControlCall {
     std::string m_body;
     std::unique_ptr<Upload> m_upload;
     std::optional<HttpAnswer> m_refusal;
+    bool m_isAnswered = false;
 };
 
 }  // namespace host

@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+#include <sys/stat.h>
 #include <unistd.h>
 
 #include <cerrno>
@@ -28,11 +29,16 @@ void warn(const std::string& text) {
 }
 
 /// For a file that a start makes: whether it could be made, in the nearest folder that is there.
-void requireWritable(const std::string& file, const std::string& advice) {
+fs::path nearestOf(const std::string& file) {
     fs::path nearest = fs::absolute(file);
     std::error_code unreachable;  // counts as missing: the folder above says why
     while (!fs::exists(nearest, unreachable))
         nearest = nearest.parent_path();
+    return nearest;
+}
+
+void requireWritable(const std::string& file, const std::string& advice) {
+    const fs::path nearest = nearestOf(file);
     int error = ::access(nearest.c_str(), W_OK) == 0 ? 0 : errno;
     if (error == 0 && nearest != fs::absolute(file) && !fs::is_directory(nearest)) error = ENOTDIR;
     if (error != 0)
@@ -118,8 +124,16 @@ void checkAdapters(const Settings& settings) {
 void checkUploads(const UploadSettings& settings) try {
     const bool isSet = settings.directory != UploadSettings{}.directory;
     if (settings.directory.empty() || (!isSet && !fs::exists(settings.directory))) return;
+    const std::string advice = "Set uploads.directory to another folder, or to \"\".";
     // Of a file in the folder, so that the folder has to be one.
-    requireWritable(settings.directory + "/image", "Set uploads.directory to another folder, or to \"\".");
+    requireWritable(settings.directory + "/image", advice);
+    struct stat status {};
+    const fs::path nearest = nearestOf(settings.directory);
+    const bool isOwn =
+        ::stat(nearest.c_str(), &status) == 0 && (status.st_uid == 0 || status.st_uid == ::geteuid());
+    if (!isOwn)
+        throw std::runtime_error(nearest.string() + " belongs to user " + std::to_string(status.st_uid) +
+                                 ". " + advice);
 } catch (const std::exception& error) {
     warn(std::string("No images are taken: ") + error.what());
 }
