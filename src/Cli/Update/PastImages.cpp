@@ -49,12 +49,10 @@ PastImages pastImagesOf(const Connection& connection, const Adapter& adapter) {
     const std::vector<Record> records = recordsOf(connection, adapter, kMost);
     const auto look = records.empty() ? std::nullopt : history::lookAt(adapter.name);
     if (!look) return past;
-    // What was broken off or failed may have left anything in the flash.
-    bool isUnchanged = true;
     for (const Record& record : records) {
         if (!isOfThisCard(record, *look) || record.outcome == history::kRefused) continue;
         const bool isWritten = record.outcome == history::kWritten;
-        if (!past.last && !isWritten && !hasChangedNothing(record)) isUnchanged = false;
+        if (!past.last && !isWritten && !past.failed && !hasChangedNothing(record)) past.failed = record;
         if (!isWritten || record.sha256.empty()) continue;
         if (!past.last) {
             past.last = record;
@@ -63,7 +61,7 @@ PastImages pastImagesOf(const Connection& connection, const Adapter& adapter) {
             break;
         }
     }
-    past.isUnchanged = isUnchanged && past.last && !past.last->versionsAfter.empty() &&
+    past.isUnchanged = !past.failed && past.last && !past.last->versionsAfter.empty() &&
                        past.last->versionsAfter == look->stored;
     return past;
 }

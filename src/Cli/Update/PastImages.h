@@ -15,6 +15,8 @@ namespace cli {
 struct PastImages {
     std::optional<history::Record> last;
     std::optional<history::Record> before;  ///< with another sum than the last
+    /// One that failed or was broken off after the last, and may have left anything in the flash.
+    std::optional<history::Record> failed;
     /// The flash holds what the last one left there: nothing else has written to it.
     bool isUnchanged = false;
 };

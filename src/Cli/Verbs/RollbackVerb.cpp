@@ -1,5 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 // Going back to the image that an adapter had before.
+#include <unistd.h>
+
 #include "Cli/Display/Output.h"
 #include "Cli/Display/Terminal.h"
 #include "Cli/Update/PastImages.h"
@@ -28,6 +30,12 @@ Record imageBefore(const Connection& connection, const Adapter& adapter) {
     if (!past.last)
         throw CommandError(ExitStatus::NotFound,
                            "The history has no image that was written to " + adapter.name + ".",
+                           "Install the image that you want with --force.");
+    if (past.failed)
+        throw CommandError(ExitStatus::Failed,
+                           "A later update of " + adapter.name + " (record " +
+                               std::to_string(past.failed->id) + " of the history: " + past.failed->outcome +
+                               ") may have left anything in its flash.",
                            "Install the image that you want with --force.");
     if (!past.isUnchanged)
         throw CommandError(
@@ -61,9 +69,10 @@ std::string fileOf(core::CimOperations& operations, const Record& image) {
     const std::int64_t bytes = image.bytes.value_or(0);
     const std::string path = localPath(image.uri).value_or("");
     const std::vector<std::string> folders = imageFolders(operations);
-    if (history::hasSum(path, image.sha256, bytes)) return path;
     for (const std::string& folder : folders)
         if (auto found = history::findImage(folder, image.sha256, bytes)) return *std::move(found);
+    // The last place, since others may be able to write there.
+    if (history::hasSum(path, image.sha256, bytes)) return path;
     throw CommandError(
         ExitStatus::NotFound,
         "The image is missing that " + image.adapter + " had before: " + imageText(image) +
@@ -92,6 +101,14 @@ ExitStatus rollback(Context& context, const VerbOptions& options) try {
                                  imageText(image) + ", from " + update.image)
                     << ".\n";
     const Outcome outcome = installCandidate(context, makeCandidate(connection, update));
+    // Whoever may write to the file's folder could have exchanged it on the way.
+    const auto written = pastImagesOf(connection, adapter).last;
+    if (outcome.status == ExitStatus::Done && written && written->process == ::getpid() &&
+        written->sha256 != image.sha256)
+        throw CommandError(ExitStatus::Failed,
+                           adapter.name + " got another image than the one that it had before: " +
+                               update.image + " was exchanged meanwhile.",
+                           "Install the image that you want with --force.");
     if (context.json)
         printJson(context.out, outcome);
     else
