@@ -198,15 +198,12 @@ HttpClient::HttpClient(const ServerSettings& settings, const std::string& user, 
                            "Free some memory and try again.");
     }
     constexpr long kConnectSeconds = 15;
-    // An answer may have to wait for the verification of a large image.
-    constexpr long kAnswerSeconds = 120;
     set(CURLOPT_ERRORBUFFER, m_error.data());
     set(CURLOPT_URL, m_isLocal ? (m_root + "/cimom").c_str() : m_url.c_str());
     if (m_isLocal) set(CURLOPT_UNIX_SOCKET_PATH, settings.url->socket().c_str());
     set(CURLOPT_PROTOCOLS_STR, "http,https");
     set(CURLOPT_NOSIGNAL, 1L);  // signals are this program's own business
     set(CURLOPT_CONNECTTIMEOUT, kConnectSeconds);
-    set(CURLOPT_TIMEOUT, kAnswerSeconds);
     set(CURLOPT_WRITEFUNCTION, &takeBody);
     set(CURLOPT_MAXFILESIZE_LARGE, static_cast<curl_off_t>(kLargestAnswer));
     set(CURLOPT_HEADERFUNCTION, &takeHeader);
@@ -234,13 +231,25 @@ HttpClient::HttpClient(const ServerSettings& settings, const std::string& user, 
 HttpReply HttpClient::post(const std::vector<std::string>& headers, const std::string& body,
                            Sending sending) {
     // The body is not copied: it outlives the transfer.
+    bePatient(false);
     set(CURLOPT_POSTFIELDS, body.c_str());
     set(CURLOPT_POSTFIELDSIZE_LARGE, static_cast<curl_off_t>(body.size()));
     return perform(headers, sending);
 }
 
+void HttpClient::bePatient(bool sendsFile) {
+    // An answer may have to wait for the verification of a large image.
+    constexpr long kAnswerSeconds = 120;
+    // A file may take its time, but not stand still: at its end, too, where the server puts it onto its disk.
+    constexpr long kStandstillSeconds = 120;
+    set(CURLOPT_TIMEOUT, sendsFile ? 0L : kAnswerSeconds);
+    set(CURLOPT_LOW_SPEED_LIMIT, sendsFile ? 1L : 0L);
+    set(CURLOPT_LOW_SPEED_TIME, sendsFile ? kStandstillSeconds : 0L);
+}
+
 HttpReply HttpClient::send(const ControlRequest& request) {
     const bool sendsFile = request.file >= 0;
+    bePatient(sendsFile);
     set(CURLOPT_URL, (m_root + request.path).c_str());
     set(CURLOPT_UPLOAD, sendsFile ? 1L : 0L);
     set(CURLOPT_CUSTOMREQUEST, request.method);
@@ -248,11 +257,6 @@ HttpReply HttpClient::send(const ControlRequest& request) {
         set(CURLOPT_READFUNCTION, &giveFile);
         set(CURLOPT_READDATA, &request.file);
         set(CURLOPT_INFILESIZE_LARGE, static_cast<curl_off_t>(request.fileBytes));
-        // It may take its time, but not stand still.
-        constexpr long kStandstill = 60;
-        set(CURLOPT_TIMEOUT, 0L);
-        set(CURLOPT_LOW_SPEED_LIMIT, 1L);
-        set(CURLOPT_LOW_SPEED_TIME, kStandstill);
     } else if (request.body.empty()) {
         set(CURLOPT_HTTPGET, 1L);
     } else {

@@ -64,6 +64,7 @@ class HttpClient {
     void set(CURLoption option, T value) {
         curl().easySetopt(m_curl.get(), option, value);
     }
+    void bePatient(bool sendsFile);
     HttpReply perform(const std::vector<std::string>& headers, Sending sending);
     [[noreturn]] void refuse(CURLcode code, bool isTooLarge) const;
 

@@ -344,7 +344,7 @@ void requireOwnSocket(const std::string& path) {
                                     : "Start it, or name its socket: --server unix:PATH.");
     }
     if (S_ISSOCK(status.st_mode) && (status.st_uid == 0 || status.st_uid == ::geteuid())) return;
-    throw CommandError(ExitStatus::WrongUse, path + " is no socket of root's or of your own.",
+    throw CommandError(ExitStatus::WrongUse, path + " is not a socket of root or of your own.",
                        "Name the socket of quenx-cimd: --server unix:PATH.");
 }
 

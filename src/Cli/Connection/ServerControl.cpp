@@ -161,19 +161,18 @@ std::optional<std::vector<update::ImageTrust>> ServerControl::trustOf(const std:
 }
 
 std::optional<std::string> ServerControl::sendFile(const std::string& file, const std::string& image) {
+    // For several adapters the same file is sent once.
+    if (const auto sent = m_sent.find({file, image}); sent != m_sent.end()) return sent->second;
     const FileToSend content(file);
     const std::string name = std::filesystem::path(file).filename().string();
     const std::string place = (image.empty() ? content.sum : image) + "/" + encoded(name);
-    // For several adapters the same file is sent once.
-    const std::pair key(place, content.sum);
-    if (const auto sent = m_sent.find(key); sent != m_sent.end()) return sent->second;
     const auto answer = call({.method = "PUT",
                               .path = std::string(control::kImages) + place,
                               .headers = {std::string(control::kSumHeader) + ": " + content.sum},
                               .file = content.file.number(),
                               .fileBytes = content.bytes});
     if (!answer) return std::nullopt;
-    return m_sent[key] = valueOf<std::string>(*answer, "uri");
+    return m_sent[{file, image}] = valueOf<std::string>(*answer, "uri");
 }
 
 std::optional<std::string> ServerControl::upload(const std::string& file) {
