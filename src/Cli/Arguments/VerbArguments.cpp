@@ -189,14 +189,14 @@ void addVerbs(CLI::App& app, Arguments& arguments) {
     addHistoryVerb(app, arguments);
     addVerb(
         app, arguments, "status", showStatus,
-        "List who holds which adapter, and how its last update ended (for root, by default on the server of "
+        "Show who holds each adapter, and how its last update ended (for root, by default on the server of "
         "this machine)");
     verb = addVerb(app, arguments, "release", releaseAdapter,
                    "Free an adapter that a check on a server still holds");
     addValue(*verb, "adapter", arguments.options.adapter, "ADAPTER",
              "Adapter: its name, PCI address or object path")
         ->required();
-    verb->footer("What a job or a check that runs needs stays held. Only quenx-cimd can do this.");
+    verb->footer("An adapter that a running job or check needs is not freed. Only quenx-cimd can do this.");
     addModelVerbs(app, arguments);
     addRegistration(app, arguments);
 }

@@ -229,7 +229,7 @@ namespace {
 std::string fileToSend(const UpdateOptions& options) {
     if (!options.upload) return {};
     if (std::optional<std::string> path = localPath(imageUri(options.image))) return std::move(*path);
-    throw CommandError(ExitStatus::WrongUse, options.image + " is no file that can be sent.",
+    throw CommandError(ExitStatus::WrongUse, options.image + " is not a file that can be sent.",
                        "Name a file of this machine, or leave out --upload.");
 }
 

@@ -82,8 +82,9 @@ Reason explainHiddenHolder(std::uint32_t returnValue, const Candidate& candidate
 }
 
 /// In the words of the service, where it is known what they were.
-Reason explainTold(const Connection& connection, std::uint32_t returnValue, const Candidate& candidate) {
-    const std::string reason = toldReason(connection, candidate.adapter.name, candidate.uri, returnValue);
+Reason explainTold(const Connection& connection, std::uint32_t returnValue, const Candidate& candidate,
+                   core::ReasonId id) {
+    const std::string reason = toldReason(connection, candidate.adapter.name, candidate.uri, returnValue, id);
     if (reason.empty()) return std::nullopt;
     // It may have met anything.
     const bool isVague = returnValue == MethodReturn::UnspecifiedError;
@@ -104,7 +105,8 @@ Reason explainClaim(const Connection& connection) {
 
 /// Who holds the adapter. If the service is busy with another adapter, it answers as it does for an image
 /// that it cannot read. In process, no other client can.
-Reason explainHolder(const Connection& connection, std::uint32_t returnValue, const Candidate& candidate) {
+Reason explainHolder(const Connection& connection, std::uint32_t returnValue, const Candidate& candidate,
+                     core::ReasonId id) {
     const bool mayBeHeld =
         returnValue == MethodReturn::InUse || returnValue == MethodReturn::UnspecifiedError;
     if (!mayBeHeld || connection.isInProcess) return std::nullopt;
@@ -125,7 +127,7 @@ Reason explainHolder(const Connection& connection, std::uint32_t returnValue, co
                            "Try again when that process is done."};
     }
     if (const Reason claim = explainClaim(connection)) return claim;
-    if (const Reason told = explainTold(connection, returnValue, candidate)) return told;
+    if (const Reason told = explainTold(connection, returnValue, candidate, id)) return told;
     return explainHiddenHolder(returnValue, candidate);
 }
 
@@ -290,7 +292,7 @@ Reason explainTrust(const Connection& connection, std::uint32_t returnValue, con
     const core::Reason* row = core::findReason(id);
     const auto number = static_cast<unsigned>(id);
     if (row == nullptr || number < kFirstOfTrust || number > kLastOfTrust) return std::nullopt;
-    const std::string told = toldReason(connection, candidate.adapter.name, candidate.uri, returnValue);
+    const std::string told = toldReason(connection, candidate.adapter.name, candidate.uri, returnValue, id);
     return Explanation{told.empty() ? row->text : sentence(told), row->advice};
 }
 
@@ -328,15 +330,15 @@ Explanation explainRefusal(const Connection& connection, std::uint32_t returnVal
                            const Candidate& candidate, core::ReasonId id) {
     if (const Reason untrusted = explainTrust(connection, returnValue, candidate, id)) return *untrusted;
     // Who holds the adapter goes first: the image may be all right.
-    Reason reason = explainHolder(connection, returnValue, candidate);
+    Reason reason = explainHolder(connection, returnValue, candidate, id);
     // These two mean anything, of which nothing can be seen from afar.
     const bool isGuessed =
         returnValue == MethodReturn::UnspecifiedError || returnValue == MethodReturn::InvalidParameter;
     if (!reason && isGuessed && !connection.isInProcess)
-        reason = explainTold(connection, returnValue, candidate);
+        reason = explainTold(connection, returnValue, candidate, id);
     if (!reason) reason = explainImage(connection, returnValue, candidate);
     if (!reason && (!isGuessed || connection.isInProcess))
-        reason = explainTold(connection, returnValue, candidate);
+        reason = explainTold(connection, returnValue, candidate, id);
     return reason ? *reason : explainReturnValue(returnValue);
 }
 

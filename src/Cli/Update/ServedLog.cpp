@@ -72,12 +72,15 @@ std::vector<Record> readHistory(const Connection& connection, const history::Fil
 }
 
 std::string toldReason(const Connection& connection, const std::string& adapter, const std::string& uri,
-                       std::uint32_t returnValue) {
+                       std::uint32_t returnValue, core::ReasonId id) {
     if (connection.isInProcess) return connection.refusals ? connection.refusals->lastReason() : "";
     try {
         for (const Record& record : readServed(*connection.operations, {.adapter = adapter}))
-            if (record.outcome == history::kRefused)
-                return record.uri == uri && record.returnValue == returnValue ? record.reason : "";
+            if (record.outcome == history::kRefused) {
+                const bool isIt = record.uri == uri && record.returnValue == returnValue &&
+                                  (id == core::ReasonId::None || record.reasonId == core::reasonCode(id));
+                return isIt ? record.reason : "";
+            }
     } catch (const core::CimError&) {
         // What explains an answer must not stand in its way.
     } catch (const CommandError&) {

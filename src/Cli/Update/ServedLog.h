@@ -6,6 +6,7 @@
 #include <vector>
 
 #include "Cli/Connection/Connection.h"
+#include "Framework/Requests/Reasons.h"
 #include "History/Record.h"
 
 namespace cli {
@@ -16,7 +17,8 @@ std::vector<history::Record> readHistory(const Connection& connection, const his
 
 /// Why the service has just answered an attempt to install this on the adapter with this value, in its words;
 /// empty where nobody tells.
+/// @param id  of the reason, where the answer has named one: an earlier refusal had another one, perhaps
 std::string toldReason(const Connection& connection, const std::string& adapter, const std::string& uri,
-                       std::uint32_t returnValue);
+                       std::uint32_t returnValue, core::ReasonId id);
 
 }  // namespace cli

@@ -4,6 +4,7 @@
 #include <fnmatch.h>
 
 #include <algorithm>
+#include <functional>
 #include <map>
 
 namespace cli {
@@ -54,21 +55,24 @@ class Chooser {
 
     /// The image that the adapter gets; nothing when none fits.
     std::optional<Candidate> choose(const Adapter& adapter) {
-        std::optional<Candidate> chosen;
+        std::vector<Candidate> fitting;
         for (std::size_t i = 0; i < m_options.size(); ++i) {
             Candidate candidate = makeCandidate(m_connection, adapter, m_options[i]);
             requireImage(candidate);
             if (m_isFit && candidate.fits() == Candidate::Answer::No) continue;
             m_isUsed[i] = true;
-            // What names its cards goes before what may be for any.
-            if (chosen && chosen->fits() == candidate.fits())
-                throw CommandError(
-                    ExitStatus::WrongUse,
-                    chosen->uri + " and " + candidate.uri + " may both be for " + adapter.name + ".",
-                    "Give one of them, or choose adapters with --match.");
-            if (!chosen || candidate.fits() == Candidate::Answer::Yes) chosen = std::move(candidate);
+            fitting.push_back(std::move(candidate));
         }
-        return chosen;
+        if (fitting.empty()) return std::nullopt;
+        // What names its cards goes before what may be for any.
+        const auto namesCard = [](const Candidate& each) { return each.fits() == Candidate::Answer::Yes; };
+        if (std::ranges::any_of(fitting, namesCard)) std::erase_if(fitting, std::not_fn(namesCard));
+        if (fitting.size() > 1)
+            throw CommandError(
+                ExitStatus::WrongUse,
+                fitting[0].uri + " and " + fitting[1].uri + " may both be for " + adapter.name + ".",
+                "Give one of them, or choose adapters with --match.");
+        return std::move(fitting.front());
     }
 
     std::vector<std::string> unused() const {

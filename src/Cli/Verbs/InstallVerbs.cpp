@@ -43,7 +43,10 @@ void judgeCompleted(Outcome& outcome, const Candidate& candidate) {
                          componentsText(outcome.after) + ", not what the image has.",
                      "Check the system log, then install again with --force."});
     } else {
-        const bool wasCurrent = candidate.isAlreadyCurrent();
+        // Of what nothing was known the versions tell afterwards.
+        const bool wasCurrent =
+            candidate.isAlreadyCurrent() ||
+            (!outcome.before.empty() && outcome.after == outcome.before && !outcome.isResetPending());
         outcome.end(ExitStatus::Done,
                     outcome.isResetPending() ? Ending::UpdatedResetPending : Ending::Updated,
                     outcome.label + (wasCurrent ? " was rewritten with the same version." : " was updated."));
