@@ -50,8 +50,9 @@ TEST_P(SessionTest, ShowsWhatIsWrittenDown) {
 INSTANTIATE_TEST_SUITE_P(Shell, SessionTest,
                          ::testing::Values("Ansible", "BadFiles", "CommandLine", "ConfigCheck", "Daemon",
                                            "Domains", "Help", "History", "Identities", "ImagePolicy",
-                                           "Install", "Json", "Many", "Policy", "Registration", "Rollback",
-                                           "Settings", "Staged", "Trust", "UsersFile", "WrongImages"),
+                                           "Install", "Json", "Many", "Pages", "Policy", "Registration",
+                                           "Rollback", "Settings", "Staged", "Trust", "UsersFile",
+                                           "WrongImages"),
                          [](const auto& session) { return session.param; });
 
 }  // namespace

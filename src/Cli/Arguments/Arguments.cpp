@@ -9,6 +9,7 @@
 #include <string_view>
 #include <tuple>
 
+#include "Cli/Arguments/Completion.h"
 #include "Cli/Arguments/Parsing.h"
 
 namespace cli {
@@ -166,6 +167,14 @@ std::optional<Arguments> readArguments(int argc, char** argv) {
                                       {"Excludes", "Not with"}})
         app.get_formatter()->label(word, plain);
     app.footer(kFooter);  // last: verbs take over the footer that is there when they are added
+    if (argc > 1 && argv[1] == std::string_view(kCompleteWord)) {
+        constexpr int kProgramAndWord = 2;
+        complete(app, {argv + kProgramAndWord, argv + argc}, arguments);
+        if (arguments.verb == nullptr) return std::nullopt;
+        chooseServer(arguments);
+        arguments.verb = showCandidates;
+        return arguments;
+    }
     try {
         app.parse(argc, argv);
     } catch (const CLI::ParseError& error) {

@@ -37,6 +37,13 @@ struct HistoryOptions {
 };
 
 /// The options and arguments of all verbs; each verb looks at its own.
+/// What a word is completed to.
+enum class CandidateKind { None, Adapters, Identities, Jobs };
+struct CandidateOptions {
+    CandidateKind kind = CandidateKind::None;
+    std::string prefix;  ///< only what begins so
+};
+
 struct VerbOptions {
     UpdateOptions update;            ///< install, check; of activate and rollback the target
     ManyOptions many;                ///< install, on several adapters
@@ -50,11 +57,14 @@ struct VerbOptions {
     std::string adapter;             ///< release
     RegistrationOptions registration;
     HistoryOptions history;  ///< history
+    CandidateOptions candidates;
 };
 
 using Verb = ExitStatus (*)(Context& context, const VerbOptions& options);
 
 ExitStatus showAdapters(Context& context, const VerbOptions& options);
+/// One a line, with a tab and a description. Not in the help: for the scripts of shells.
+ExitStatus showCandidates(Context& context, const VerbOptions& options);
 ExitStatus showIdentities(Context& context, const VerbOptions& options);
 
 ExitStatus install(Context& context, const VerbOptions& options);
