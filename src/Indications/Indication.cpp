@@ -4,17 +4,14 @@
 #include <algorithm>
 #include <array>
 
+#include "Framework/Events/LifecycleIndication.h"
+
 namespace indications {
 
 namespace {
 
 using core::CimType;
 using core::CimValue;
-
-const char* classNameOf(const core::InstanceEvent& event) {
-    if (event.before == nullptr) return "CIM_InstCreation";
-    return event.after == nullptr ? "CIM_InstDeletion" : "CIM_InstModification";
-}
 
 core::PropertyValue textProperty(const char* name, std::string text) {
     return {name, CimValue::of(CimType::String, std::move(text)), false, {}};
@@ -84,17 +81,12 @@ core::InstanceSnapshot projected(const core::InstanceSnapshot& instance, const Q
 
 Indication::Indication(const core::InstanceEvent& event, std::string identifier, std::string host,
                        const core::ClassLookup& classes)
-    : m_className(classNameOf(event)), m_source(event.after == nullptr ? event.before : event.after) {
-    if (event.after != nullptr) m_previous = event.before;
-    m_sourceClass = classes(m_source->path.getClassName());
-    core::CimPath path = m_source->path;
-    path.setHost(host);
-    m_properties.push_back(textProperty("IndicationIdentifier", std::move(identifier)));
-    m_properties.push_back(
-        {"IndicationTime", CimValue::of(CimType::Datetime, utils::Time::fromEpoch(event.time)), false, {}});
-    m_properties.push_back(textProperty("SourceInstanceModelPath", path.toString()));
-    m_properties.push_back(textProperty("SourceInstanceHost", std::move(host)));
-}
+    : m_className(core::indicationClassOf(event)),
+      m_source(core::sourceOf(event)),
+      m_previous(core::previousOf(event)),
+      m_sourceClass(classes(m_source->path.getClassName())),
+      m_properties(core::indicationProperties(event, std::move(identifier), std::move(host),
+                                              m_source->path.getNamespace())) {}
 
 bool Indication::matches(const Query& query) const {
     const SourceObject source(*m_source, m_sourceClass);
