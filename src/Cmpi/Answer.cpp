@@ -69,13 +69,10 @@ Status refuseForBuild(const Sender& sender) {
             utils::buildId() + ". Install all of them from one build, and restart the object manager.");
 }
 
-Status carryOut(const Sender& sender, const std::function<void(Request&)>& body) {
+Status carryOut(const Sender& sender, const std::function<void()>& body) {
     try {
-        Request request(sender);
-        body(request);
-        const Status done = call(sender.result, &ResultTable::returnDone);
-        if (done.rc == ReturnCode::Ok) return {ReturnCode::Ok, nullptr};
-        return failure(sender, CimStatus::Failed, "the object manager did not take the end of the results");
+        body();
+        return {ReturnCode::Ok, nullptr};
     } catch (const core::CimError& error) {
         return failure(sender, error.status(), core::shownText(error));
     } catch (const std::bad_alloc&) {
@@ -87,7 +84,7 @@ Status carryOut(const Sender& sender, const std::function<void(Request&)>& body)
 
 }  // namespace
 
-Status answerWith(const Sender& sender, const std::function<void(Request&)>& body) noexcept {
+Status statusOf(const Sender& sender, const std::function<void()>& body) noexcept {
     const CancellationBan ban;
     try {
         if (&QUENX_BUILD_SYMBOL == nullptr) return refuseForBuild(sender);
@@ -96,6 +93,16 @@ Status answerWith(const Sender& sender, const std::function<void(Request&)>& bod
         // Not even the text could be built.
         return {ReturnCode::Failed, nullptr};
     }
+}
+
+Status answerWith(const Sender& sender, const std::function<void(Request&)>& body) noexcept {
+    const auto whole = [&] {
+        Request request(sender);
+        body(request);
+        if (call(sender.result, &ResultTable::returnDone).rc != ReturnCode::Ok)
+            throw core::CimError(CimStatus::Failed, "the object manager did not take the end of the results");
+    };
+    return statusOf(sender, std::cref(whole));
 }
 
 }  // namespace cmpi

@@ -40,6 +40,7 @@ HAS_SLOTS(Broker, eft, 2, mft, 4);
 // Two ints at the front, which share a slot of 64 bits and take two of 32.
 constexpr std::size_t kHead = 2 * sizeof(int) / sizeof(void*) - 1;
 HAS_SLOTS(BrokerTable, execQuery, 11 + kHead, getProperty, 19 + kHead);
+static_assert(SLOT_OF(BrokerTable, deliverIndication) == 5 + kHead);
 HAS_SLOTS(InstanceMITable, createInstance, 6 + kHead, execQuery, 9 + kHead);
 HAS_SLOTS(AssociationMITable, associators, 3 + kHead, referenceNames, 6 + kHead);
 HAS_SLOTS(MethodMITable, cleanup, 2 + kHead, invokeMethod, 3 + kHead);

@@ -11,6 +11,8 @@ QUENX_EXPORT cmpi::InstanceMI* Quenx_Create_InstanceMI(const cmpi::Broker*, cons
 QUENX_EXPORT cmpi::AssociationMI* Quenx_Create_AssociationMI(const cmpi::Broker*, const cmpi::Context*,
                                                              cmpi::Status*);
 QUENX_EXPORT cmpi::MethodMI* Quenx_Create_MethodMI(const cmpi::Broker*, const cmpi::Context*, cmpi::Status*);
+QUENX_EXPORT cmpi::IndicationMI* Quenx_Create_IndicationMI(const cmpi::Broker*, const cmpi::Context*,
+                                                           cmpi::Status*);
 }
 
 namespace cmpi {

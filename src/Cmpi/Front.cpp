@@ -6,6 +6,7 @@
 #include <algorithm>
 #include <new>
 
+#include "Cmpi/Listening.h"
 #include "Framework/Classes/CimBroker.h"
 #include "Framework/Classes/InstanceList.h"
 #include "Framework/Model/CimError.h"
@@ -22,14 +23,6 @@ using core::CimStatus;
 using core::ProviderLibraries;
 using Locker = utils::Mutex::AutoLocker;
 
-/// The file of this library.
-std::string ownFile() {
-    Dl_info own{};
-    static const char inside = 0;
-    ::dladdr(&inside, &own);
-    return own.dli_fname;
-}
-
 /// A library that does not load is logged, and the others serve.
 std::unique_ptr<core::ProviderSession> openSession() {
     // A daemon may have closed them. An image that got one of their numbers would count as not readable, and
@@ -41,6 +34,7 @@ std::unique_ptr<core::ProviderSession> openSession() {
     utils::SMASHv2Config::getInstance()->setDefaultImageReadTimeout(std::chrono::seconds(20));
     if (const std::string problem = session->loadHistory(); !problem.empty())
         utils::writeAuditLog("[history] No record is kept of updates: " + utils::escapeForLog(problem, 400));
+    session->tellEvents(Listening::theOne().sink());
     session->libraries().load(directory);
     for (const ProviderLibraries::Problem& problem : session->libraries().problems())
         QUENX_ERROR("Cannot load %s: %s", problem.file.c_str(), problem.reason.c_str());
@@ -74,6 +68,13 @@ const End end;
 
 }  // namespace
 
+void* openThisLibrary(int flags) noexcept {
+    Dl_info own{};
+    static const char inside = 0;
+    ::dladdr(&inside, &own);
+    return ::dlopen(own.dli_fname, RTLD_LAZY | RTLD_NOLOAD | flags);
+}
+
 Front& Front::theOne() {
     alignas(Front) static unsigned char place[sizeof(Front)];
     static Front* const front = new (place) Front;
@@ -98,6 +99,7 @@ void Front::create(Interface interface, const Broker* broker) {
 bool Front::isBusy() noexcept try {
     if (m_requests != 0) return true;
     if (m_session == nullptr) return false;
+    if (Listening::theOne().isBusy()) return true;
     core::CimOperations& operations = *m_session->operations();
     return !instancesOf(operations, "CIM_ConcreteJob").empty() || isAdapterClaimed(operations) ||
            core::isReaperBusy();
@@ -112,6 +114,7 @@ ReturnCode Front::cleanup(Interface interface) {
     m_isLeaving = true;
     m_interfaces &= ~static_cast<unsigned int>(interface);
     if (m_interfaces == 0) {
+        if (m_session != nullptr) Listening::theOne().endWithSession(false);
         m_session.reset();
         m_self.reset();
         m_isLeaving = false;
@@ -124,6 +127,10 @@ void Front::leave() {
     {
         const Locker lock(m_mutex);
         m_hasLeft = true;
+    }
+    Listening::theOne().endWithSession(true);
+    {
+        const Locker lock(m_mutex);
         // A request that still runs at the exit of a process needs what it uses.
         if (m_requests == 0) session = std::move(m_session);
     }
@@ -135,7 +142,7 @@ core::CimOperations& Front::enter(Interface interface) try {
     if (m_hasLeft) throw CimError(CimStatus::Failed, "the process is about to end");
     if (m_session == nullptr) {
         m_session = openSession();
-        m_self.reset(::dlopen(ownFile().c_str(), RTLD_LAZY | RTLD_NOLOAD));
+        m_self.reset(openThisLibrary());
     }
     use(interface);
     ++m_requests;

@@ -11,7 +11,11 @@
 namespace cmpi {
 
 /// The interfaces that the module offers, as bits of a set.
-enum class Interface : unsigned int { Instance = 1, Association = 2, Method = 4 };
+enum class Interface : unsigned int { Instance = 1, Association = 2, Method = 4, Indication = 8 };
+
+/// One more hold on this library, to be given back by dlclose(); null where there is none to be had.
+/// @param flags  more of those of dlopen()
+void* openThisLibrary(int flags = 0) noexcept;
 
 /// The one front of the process: which interfaces are in use, and the session that answers them. The session
 /// is opened by the first request, and ended when the object manager has cleaned up all interfaces. Nothing
@@ -52,8 +56,8 @@ class Front {
   private:
     core::CimOperations& enter(Interface interface);
     void exit();
-    /// A request is in hand, a job is listed, or an adapter is claimed. Jobs and their ids are lost with the
-    /// process, and a claim keeps other updates away.
+    /// A request is in hand, a job is listed, an adapter is claimed, or somebody listens. Jobs and their ids
+    /// are lost with the process, and a claim keeps other updates away.
     bool isBusy() noexcept QUENX_REQUIRES(m_mutex);
     void use(Interface interface) QUENX_REQUIRES(m_mutex);
 

@@ -11,7 +11,7 @@
 
 namespace cmpi {
 
-/// The arguments that every function of an MI takes. Any may be null.
+/// The arguments that functions of an MI take. Any may be null.
 struct Sender {
     Interface interface;
     const Context* context;
@@ -49,7 +49,6 @@ class Request {
                  const std::function<std::string()>& work) const;
 
   private:
-    void take(Status status) const;
     core::Caller caller() const;
 
     const Sender& m_sender;
@@ -64,9 +63,12 @@ core::PropertyFilter filterFrom(const char** names);
 
 /// Runs the body and turns its end, every exception included, into a status with its text, and into a
 /// CIM_Error where the object manager takes one. The thread cannot be cancelled meanwhile.
+Status statusOf(const Sender& sender, const std::function<void()>& body) noexcept;
+
+/// The same for a body that gives results, whose end is told.
 Status answerWith(const Sender& sender, const std::function<void(Request&)>& body) noexcept;
 
-/// The same for any body; by reference, since a copy could find no memory before anything is caught.
+/// The same for any such body; by reference, since a copy could find no memory before anything is caught.
 template <class Body>
 Status answer(const Sender& sender, const Body& body) noexcept {
     return answerWith(sender, std::cref(body));

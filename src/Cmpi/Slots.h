@@ -64,6 +64,20 @@ inline std::string textOf(const char* text) {
     return text == nullptr ? "" : text;
 }
 
+/// What the object manager was to make. Throws core::CimError where it did not.
+template <class Object>
+Object* made(Object* object, const char* what) {
+    if (object != nullptr) return object;
+    throw core::CimError(core::CimStatus::Failed, std::string("the object manager could not make ") + what);
+}
+/// Throws core::CimError unless the object manager has taken it.
+inline void requireTaken(Status status, const char* what) {
+    if (status.rc == ReturnCode::Ok) return;
+    throw core::CimError(core::CimStatus::Failed, std::string("the object manager did not take ") + what +
+                                                      " (code " +
+                                                      std::to_string(static_cast<int>(status.rc)) + ")");
+}
+
 /// A string of the object manager; null where it cannot be had.
 inline String* newString(const Broker& broker, const std::string& text) {
     return call(broker, broker.eft, &BrokerEncTable::newString, text.c_str(), nullptr);

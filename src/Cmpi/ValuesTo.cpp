@@ -2,28 +2,13 @@
 // From the request layer to the object manager.
 #include "Cmpi/Slots.h"
 #include "Cmpi/Values.h"
-#include "Framework/Model/CimError.h"
 
 namespace cmpi {
 
 namespace {
 
-using core::CimError;
 using core::CimScalar;
-using core::CimStatus;
 using core::CimType;
-
-template <class Object>
-Object* made(Object* object, const char* what) {
-    if (object != nullptr) return object;
-    throw CimError(CimStatus::Failed, std::string("the object manager could not make ") + what);
-}
-
-void require(Status status, const char* what) {
-    if (status.rc == ReturnCode::Ok) return;
-    throw CimError(CimStatus::Failed, std::string("the object manager did not take ") + what + " (code " +
-                                          std::to_string(static_cast<int>(status.rc)) + ")");
-}
 
 /// The first character of a text as UTF-16; U+FFFD where it takes two units.
 unsigned short utf16Of(const std::string& text) {
@@ -105,8 +90,8 @@ ObjectPath* newPath(const Place& place, const core::CimPath& path) {
              "an object path");
     for (const core::CimKey& key : path.getKeys()) {
         const Given value(place, typeOf(key.value), key.value);
-        require(call(result, &ObjectPathTable::addKey, key.name.c_str(), value.value(), value.type()),
-                "a key");
+        requireTaken(call(result, &ObjectPathTable::addKey, key.name.c_str(), value.value(), value.type()),
+                     "a key");
     }
     return result;
 }
@@ -152,7 +137,8 @@ Array* Given::newArray(const Place& place, CimType type, const std::vector<CimSc
              "an array");
     for (Count i = 0; i < count; ++i) {
         const Given element(place, type, elements[i]);
-        require(call(array, &ArrayTable::setElementAt, i, element.value(), element.type()), "an element");
+        requireTaken(call(array, &ArrayTable::setElementAt, i, element.value(), element.type()),
+                     "an element");
     }
     return array;
 }

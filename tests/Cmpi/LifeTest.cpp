@@ -1,16 +1,16 @@
 // SPDX-License-Identifier: Apache-2.0
 // From the loading of the front to its end, as object managers decide them.
 #include <gtest/gtest.h>
-#include <sys/wait.h>
 #include <unistd.h>
 
 #include <atomic>
 #include <csignal>
 #include <fstream>
+#include <future>
 #include <iterator>
 #include <thread>
 
-#include "Cmpi/LoadedFront.h"
+#include "Cmpi/Listener.h"
 #include "Support/ProviderLibrary.h"
 #include "Support/SimulatedAdapters.h"
 #include "Support/TestRoms.h"
@@ -52,18 +52,6 @@ int isMapped(const char* library) {
     return handle == nullptr ? 0 : (dlclose(handle), 1);
 }
 
-/// Runs in a fork without an exec, as one manager's process is. Returns how it ended.
-int asChild(const std::function<void()>& body) {
-    if (const pid_t child = ::fork(); child != 0) {
-        int status = -1;
-        ::waitpid(child, &status, 0);
-        return status;
-    }
-    ::alarm(60);
-    body();
-    std::exit(0);
-}
-
 class CmpiLifeTest : public ::testing::TestWithParam<test::Dialect> {
   protected:
     /// What a manager with a client writes down. The first adapter gets a real image, of a revision of its
@@ -72,7 +60,7 @@ class CmpiLifeTest : public ::testing::TestWithParam<test::Dialect> {
         const auto image = test::withRevision(test::realRom("efi-virtio"), ++m_revision);
         const std::string uri = "file://" + m_adapters.folder().write("image.rom", std::span(image));
         const std::string file = m_adapters.folder() / "transcript";
-        const int status = asChild([&] {
+        const int status = test::asChild([&] {
             m_out.open(file);
             // Descriptors and signals as the daemon has them.
             ::close(STDIN_FILENO);
@@ -93,8 +81,10 @@ class CmpiLifeTest : public ::testing::TestWithParam<test::Dialect> {
         if (scenario == "fork") {
             front.create();
             m_out << "first " << front.first("Quenx_EthernetPort").getClassName() << std::endl;
-            std::_Exit(asChild([&] { serve(front, "follow", uri); }) == 0 ? 0 : 1);
+            std::_Exit(test::asChild([&] { serve(front, "follow", uri); }) == 0 ? 0 : 1);
         }
+        if (scenario == "listen" || scenario == "gone" || scenario == "hang")
+            serveListener(front, scenario, uri);
         const CimPath job = install(front, uri);
         if (scenario == "exit" || scenario == "unload") {
             m_out << "shutdown:" << front.cleanup(true) << std::endl;
@@ -108,19 +98,29 @@ class CmpiLifeTest : public ::testing::TestWithParam<test::Dialect> {
     }
 
     CimPath install(const LoadedFront& front, const std::string& uri) {
-        const Request request{
-            "invoke",
-            front.first("Quenx_SoftwareInstallationService"),
-            {},
-            {},
-            "InstallFromURI",
-            {{"URI", CimValue::of(CimType::String, uri)},
-             {"Target", CimValue::of(CimType::Reference, front.first("Quenx_EthernetPort"))},
-             {"InstallOptions", CimValue::arrayOf(CimType::Uint16, {std::uint64_t{5}})},
-             {"InstallOptionsValues", CimValue::arrayOf(CimType::String, {})}}};
-        const core::MethodResult result = front.ask(request).called;
+        const core::MethodResult result = front.install(uri, front.first("Quenx_EthernetPort"));
         m_out << "returned " << result.returnValue << std::endl;
         return *result.outputs.at(0).value.get<CimPath>();
+    }
+
+    /// With a subscription; the manager ends in the middle of the update.
+    void serveListener(LoadedFront& front, const std::string& scenario, const std::string& uri) {
+        test::Listener listener(front);
+        std::promise<void> isIn;
+        front.broker.deliveries.whileDelivering = [&]() -> cmpi::ReturnCode {
+            if (scenario == "hang") isIn.set_value();
+            while (scenario == "hang")
+                pause(1000);
+            return cmpi::ReturnCode::Ok;
+        };
+        listener.begin();
+        install(front, uri);
+        if (scenario == "hang") isIn.get_future().wait();
+        if (scenario == "listen") m_out << "asked:" << listener.cleanup() << std::endl;
+        if (scenario != "gone") m_out << "shutdown:" << listener.cleanup(true) << std::endl;
+        if (scenario == "listen") m_out << "contexts: " << front.broker.deliveries.contexts() << std::endl;
+        if (scenario == "hang") front.unload();
+        std::exit(0);
     }
 
     /// While the manager asks every 100 ms whether it may unload.
@@ -163,6 +163,13 @@ TEST_P(CmpiLifeTest, EndsAShutdownOnlyWithTheFlashAndServesAForkedChild) {
     EXPECT_EQ(run("exit"), "returned 4096\nshutdown: 50 50 50\n");
     EXPECT_EQ(run("unload"), "returned 4096\nshutdown: 50 50 50\nmapped: 11\n");
     EXPECT_EQ(run("fork"), "first Quenx_EthernetPort\nreturned 4096\nended with 7\n" + m_gone);
+}
+
+TEST_P(CmpiLifeTest, EndsItsOwnThreadWithTheManagerWhateverThatDoes) {
+    if (__has_feature(thread_sanitizer)) GTEST_SKIP() << "the thread sanitizer has a thread that never ends";
+    EXPECT_EQ(run("listen"), "returned 4096\nasked: 50 50 50 50\nshutdown: 50 50 50 50\ncontexts: 0\n");
+    EXPECT_EQ(run("gone"), "returned 4096\n") << "without a word";
+    EXPECT_EQ(run("hang"), "returned 4096\nshutdown: 50 50 50 50\n");
 }
 
 INSTANTIATE_TEST_SUITE_P(Manager, CmpiLifeTest, ::testing::ValuesIn(test::kDialects));

@@ -2,6 +2,8 @@
 #pragma once
 
 #include <dlfcn.h>
+#include <sys/wait.h>
+#include <unistd.h>
 
 #include "Cmpi/TestBroker.h"
 
@@ -30,7 +32,7 @@ struct LoadedFront {
         made = reinterpret_cast<Create>(dlsym(handle, name))(&broker.broker, call.context.as<cmpi::Context>(),
                                                              &status);
     }
-    /// The codes of all interfaces, in the manager's order, with a blank before each.
+    /// The codes of all these interfaces, in the manager's order, with a blank before each.
     std::string cleanup(bool isTerminating = false) const {
         const auto code = [&](auto* mi) { return clean(mi, isTerminating); };
         const std::string first = broker.isSfcb ? "" : code(methods);
@@ -54,6 +56,21 @@ struct LoadedFront {
     }
     core::CimPath first(const char* className) const {
         return ask({"names", core::CimPath(className, {})}).paths.at(0);
+    }
+    /// What InstallFromURI answers.
+    core::MethodResult install(const std::string& uri, const core::CimPath& port) const {
+        using core::CimType;
+        using core::CimValue;
+        const Request request{"invoke",
+                              first("Quenx_SoftwareInstallationService"),
+                              {},
+                              {},
+                              "InstallFromURI",
+                              {{"URI", CimValue::of(CimType::String, uri)},
+                               {"Target", CimValue::of(CimType::Reference, port)},
+                               {"InstallOptions", CimValue::arrayOf(CimType::Uint16, {std::uint64_t{5}})},
+                               {"InstallOptionsValues", CimValue::arrayOf(CimType::String, {})}}};
+        return ask(request).called;
     }
     /// One call of a function of an MI.
     cmpi::Status send(Call& call) const;
@@ -101,6 +118,18 @@ inline cmpi::Status LoadedFront::send(Call& call) const {
     if (op == "references") return on(associations, &A::references, result, role, list);
     if (op == "referenceNames") return on(associations, &A::referenceNames, result, role);
     throw std::logic_error("no operation " + op);
+}
+
+/// Runs in a fork without an exec, as one manager's process is. Returns how it ended.
+inline int asChild(const std::function<void()>& body) {
+    if (const pid_t child = ::fork(); child != 0) {
+        int status = -1;
+        ::waitpid(child, &status, 0);
+        return status;
+    }
+    ::alarm(60);
+    body();
+    std::exit(0);
 }
 
 }  // namespace test

@@ -161,7 +161,7 @@ core::PropertyFilter filterOf(const Node& instance) {
     return filter;
 }
 
-void giveInstance(const Node& instance) {
+core::InstanceValue instanceOf(const Node& instance) {
     core::InstanceValue value{pathOf(instance, instance.keys), {}};
     const core::PropertyFilter filter = filterOf(instance);
     const core::WantedProperties wanted(filter);
@@ -169,12 +169,58 @@ void giveInstance(const Node& instance) {
         if (wanted.includes(property.name))
             value.properties.push_back({property.name, property.value, false, {}});
     }
-    now().answers.instances.push_back(std::move(value));
+    return value;
 }
 
 void giveNumber(const CimValue& value) {
     const auto number = static_cast<std::uint32_t>(*value.get<std::uint64_t>());
     now().answers.called = {number, {}, value.type};
+}
+
+// Threads of the front's own. What they make is theirs until they detach.
+
+thread_local std::unique_ptr<Call> attachedCall;
+
+Deliveries& deliveriesOf(const cmpi::Broker* broker) {
+    return static_cast<TestBroker*>(broker->hdl)->deliveries;
+}
+
+cmpi::Context* prepareThread(const cmpi::Broker* broker, const cmpi::Context* from) {
+    at(from);
+    Deliveries& deliveries = deliveriesOf(broker);
+    const std::lock_guard lock(deliveries.mutex);
+    Node& node = *deliveries.prepared.emplace_back(std::make_unique<Node>(Node{nullptr, from->ft, ""}));
+    node.hdl = &node;
+    return node.as<cmpi::Context>();
+}
+
+Status attachThread(const cmpi::Broker* broker, const cmpi::Context* context) {
+    at(context);
+    attachedCall = std::make_unique<Call>(*static_cast<TestBroker*>(broker->hdl));
+    attachedCall->attachedAs = context;
+    attachedCall->firstOwn = attachedCall->nodes.size();
+    return kDone();
+}
+
+Status detachThread(const cmpi::Broker* broker, const cmpi::Context* context) {
+    if (attachedCall == nullptr || attachedCall->attachedAs != context) die("detached as somebody else");
+    // An enumeration among what is left would be freed twice.
+    const cmpi::BrokerMemTable* memory = broker->mft;
+    const bool hasMarks = memory != nullptr && memory->mark != nullptr && memory->release != nullptr;
+    if (hasMarks && now().nodes.size() != now().firstOwn) die("a thread without a mark");
+    const std::lock_guard lock(deliveriesOf(broker).mutex);
+    at(context).isAlive = false;
+    attachedCall.reset();
+    return kDone();
+}
+
+Status deliverIndication(const cmpi::Broker* broker, const cmpi::Context* context, const char* nameSpace,
+                         const cmpi::Instance* indication) {
+    if (now().attachedAs != context) die("a context that is not the thread's");
+    const ReturnCode code = deliveriesOf(broker).whileDelivering();
+    if (code == ReturnCode::Ok)
+        deliveriesOf(broker).add({nameSpace, instanceOf(at(indication)), at(indication).embedded});
+    return {code, nullptr};
 }
 
 /// Looked at when the instance is given, as managers may.
@@ -250,9 +296,13 @@ Answers Call::finish(Status status) {
 
 // What is not set here is null: a call of it ends the program.
 TestBroker::TestBroker(Dialect dialect) : isSfcb(dialect == Dialect::Sfcb) {
-    broker = {nullptr, &table, &factories, nullptr, isSfcb ? &memory : nullptr};
+    broker = {this, &table, &factories, nullptr, isSfcb ? &memory : nullptr};
     table.brokerVersion = isSfcb ? 0 : cmpi::kLevel;
     table.brokerName = isSfcb ? "RequestHandler" : "Pegasus";
+    table.prepareAttachThread = prepareThread;
+    table.attachThread = attachThread;
+    table.detachThread = detachThread;
+    table.deliverIndication = deliverIndication;
     factories.ftVersion = isSfcb ? 1 : cmpi::kLevel;
     results.ftVersion = cmpi::kLevel;
     const auto all = [](auto&... tables) {
@@ -288,7 +338,9 @@ TestBroker::TestBroker(Dialect dialect) : isSfcb(dialect == Dialect::Sfcb) {
     results.returnData = [](auto, auto* value, auto type) {
         return giveNumber(valueOf(value, type)), kDone();
     };
-    results.returnInstance = [](auto, auto* instance) { return giveInstance(at(instance)), kDone(); };
+    results.returnInstance = [](auto, auto* instance) {
+        return now().answers.instances.push_back(instanceOf(at(instance))), kDone();
+    };
     results.returnObjectPath = [](auto, auto* path) {
         return now().answers.paths.push_back(pathOf(at(path), at(path).entries)), kDone();
     };
@@ -299,7 +351,10 @@ TestBroker::TestBroker(Dialect dialect) : isSfcb(dialect == Dialect::Sfcb) {
     arrays.setElementAt = [](auto* array, auto index, auto* value, auto type) {
         return at(array).entries.at(index) = Entry("", valueOf(value, type)), kDone();
     };
-    instances.setProperty = kSet;
+    instances.setProperty = [](auto* instance, auto* name, auto* value, auto type) {
+        if (type != cmpi::kInstance) return kSet(instance, name, value, type);
+        return at(instance).embedded[name] = instanceOf(at(value->inst)), kDone();
+    };
     instances.setPropertyFilter = [](auto* instance, auto properties, auto keys) {
         return setFilter(at(instance), properties, keys), kDone();
     };

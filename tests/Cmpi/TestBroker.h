@@ -1,8 +1,12 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include <condition_variable>
 #include <deque>
+#include <functional>
+#include <map>
 #include <memory>
+#include <mutex>
 #include <ostream>
 
 #include "Cmpi/Cmpi.h"
@@ -38,6 +42,7 @@ struct Node {
     std::vector<Entry> entries = {};
     std::vector<Entry> keys = {};                       ///< of an instance
     std::pair<const char**, const char**> filter = {};  ///< of an instance: what is wanted, and its keys
+    std::map<std::string, core::InstanceValue> embedded = {};  ///< in an instance
     bool isAlive = true;
 
     template <class Handle>
@@ -46,11 +51,40 @@ struct Node {
     }
 };
 
+/// One indication as the manager gets it.
+struct Delivered {
+    std::string nameSpace;
+    core::InstanceValue indication;
+    std::map<std::string, core::InstanceValue> embedded;
+};
+
+/// The manager's side of indications. Thread-safe.
+class Deliveries {
+  public:
+    void add(Delivered delivered);
+    std::vector<Delivered> waitFor(std::size_t count);
+    std::vector<Delivered> all() { return waitFor(0); }
+    /// Contexts of threads that are prepared, and not detached.
+    int contexts();
+    /// Contexts that have been prepared: for a thread, and for each indication.
+    std::size_t attempts();
+
+    /// Runs within each delivery, on the thread that makes it; set before there is any.
+    std::function<cmpi::ReturnCode()> whileDelivering = [] { return cmpi::ReturnCode::Ok; };
+
+    std::mutex mutex;
+    std::condition_variable changed;
+    std::vector<Delivered> delivered = {};
+    std::deque<std::unique_ptr<Node>> prepared = {};  ///< a dead one has been attached, and detached
+};
+
 /// The tables of one dialect; public, so that a test can take a slot away.
 struct TestBroker {
     explicit TestBroker(Dialect dialect);
     bool isSfcb;
+    TestBroker(const TestBroker&) = delete;
     std::string parameters = {};  ///< of the registration
+    Deliveries deliveries = {};
     cmpi::Broker broker{};
     cmpi::BrokerTable table{};
     cmpi::BrokerEncTable factories{};
@@ -107,6 +141,8 @@ struct Call {
     Node& in;
     Node& out;
     Answers answers = {};
+    const cmpi::Context* attachedAs = nullptr;  ///< of a thread of the front's own
+    std::size_t firstOwn = 0;                   ///< the nodes from here on were made by that thread
 };
 
 }  // namespace test
