@@ -13,7 +13,7 @@ constexpr const char* kModule = "QuenxModule";
 constexpr const char* kProviders = "quenx-pegasus.mof";
 
 std::string number(ProviderType type) {
-    constexpr std::array kNumbers = {"2", "3", "5"};
+    constexpr std::array kNumbers = {"2", "3", "5", "4"};
     return kNumbers[static_cast<std::size_t>(type)];
 }
 
@@ -87,8 +87,9 @@ std::string deletions(const Registered& registered) {
 Registration pegasusRegistration(const Registered& registered) {
     std::string text = headLine("//", "the registration, for the interop namespace of the object manager.");
     text += moduleText();
-    for (const RegisteredClass& each : registered.classes)
-        text += capabilities(each, registered.namespaces);
+    for (const auto* classes : {&registered.classes, &registered.indications})
+        for (const RegisteredClass& each : *classes)
+            text += capabilities(each, registered.namespaces);
     std::vector<std::string> steps = {
         "Have libQuenx_Cmpi.so in the provider directory (providerDir of the configuration).",
         "Where an earlier version is registered, remove that first (--remove)."};

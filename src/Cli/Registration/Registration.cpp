@@ -74,6 +74,14 @@ std::vector<ProviderType> typesOf(const core::ClassChain& chain) {
     return types;
 }
 
+/// Clients' filters are for these by name, so subclasses of them would not do.
+std::vector<RegisteredClass> indicationClasses() {
+    std::vector<RegisteredClass> classes;
+    for (const char* const name : {"CIM_InstCreation", "CIM_InstModification", "CIM_InstDeletion"})
+        classes.push_back({name, {ProviderType::Indication}});
+    return classes;
+}
+
 constexpr const char* kWritten = " Written by quenxctl: ";
 
 }  // namespace
@@ -94,6 +102,7 @@ Registration registrationFor(const RegistrationOptions& options, core::CimOperat
     std::vector<core::ClassChain> classes = operations.enumerateClasses("", true);
     std::erase_if(classes, isStandard);
     Registered registered{.classes = {},
+                          .indications = indicationClasses(),
                           .namespaces = namespacesFor(options, operations.getNamespace()),
                           .mof = {"quenx-classes.mof", "", isWrittenHere}};
     std::string& mof = registered.mof.text;

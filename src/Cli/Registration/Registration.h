@@ -33,7 +33,7 @@ struct Registration {
 };
 
 /// What an object manager can ask a provider for.
-enum class ProviderType { Instance, Association, Method };
+enum class ProviderType { Instance, Association, Method, Indication };
 
 /// A class that is to be registered, and what it needs to be served with.
 struct RegisteredClass {
@@ -43,9 +43,10 @@ struct RegisteredClass {
 
 /// What there is to register, whatever the object manager.
 struct Registered {
-    std::vector<RegisteredClass> classes;  ///< in the order of the MOF
-    std::vector<std::string> namespaces;   ///< at least one
-    RegistrationFile mof;                  ///< the declarations of those classes
+    std::vector<RegisteredClass> classes;      ///< in the order of the MOF
+    std::vector<RegisteredClass> indications;  ///< the standard's, which tell of instances of the others
+    std::vector<std::string> namespaces;       ///< at least one
+    RegistrationFile mof;                      ///< the declarations of those classes
 };
 
 /// As the entry points of the library have it in front of _Create_.

@@ -14,8 +14,12 @@ namespace {
 constexpr const char* kRegister = "quenx-sfcb.reg";
 
 const char* word(ProviderType type) {
-    constexpr std::array kWords = {"instance", "association", "method"};
+    constexpr std::array kWords = {"instance", "association", "method", "indication"};
     return kWords[static_cast<std::size_t>(type)];
+}
+
+std::string providerLine() {
+    return joined({"   provider:", kProviderName}, " ");
 }
 
 /// One group, so that one process has all jobs and claims; it must not be unloaded, since they end with it.
@@ -24,24 +28,39 @@ std::string section(const RegisteredClass& registered, const std::vector<std::st
     for (const ProviderType type : registered.types)
         types.emplace_back(word(type));
     const std::string name(kProviderName);
-    std::string text = "[" + registered.name + "]\n   provider: " + name +
-                       "\n   location: " + kProviderLibrary + "\n   type: " + joined(types, " ") +
-                       "\n   namespace: " + joined(namespaces, " ") + "\n   group: " + name +
-                       "\n   unload: never\n";
+    std::string text = "[" + registered.name + "]\n" + providerLine() + "\n   location: " + kProviderLibrary +
+                       "\n   type: " + joined(types, " ") + "\n   namespace: " + joined(namespaces, " ") +
+                       "\n   group: " + name + "\n   unload: never\n";
     // sfcb asks once for each association, and says in no other way which one it is about.
     if (std::ranges::find(registered.types, ProviderType::Association) != registered.types.end())
         text += "   parameters: " + registered.name + "\n";
     return text;
 }
 
-/// A register has no comment that all versions take, so it is known by its classes; one to which somebody has
-/// added another's is not replaced.
+/// A register has no comment that all versions take, so it is known by its classes, and by its provider where
+/// they are the standard's; one to which somebody has added another's is not replaced.
 bool isOwnRegister(const std::string& text) {
     const std::string own = std::string("[") + kProviderName + "_";
     const auto lines = utils::split(text, '\n');
-    return text.starts_with(own) && std::ranges::all_of(lines, [&](const std::string& line) {
-               return !utils::trim(line).starts_with('[') || line.starts_with(own);
-           });
+    const auto isOwnOrNone = [&](std::size_t i) {
+        if (!utils::trim(lines[i]).starts_with('[') || lines[i].starts_with(own)) return true;
+        return lines[i].starts_with("[CIM_") && i + 1 < lines.size() && lines[i + 1] == providerLine();
+    };
+    std::size_t known = 0;
+    while (known < lines.size() && isOwnOrNone(known))
+        ++known;
+    return text.starts_with(own) && known == lines.size();
+}
+
+/// A repository has those of the standard's classes alone that somebody's are below, and the standard's
+/// indications may be above nobody's yet.
+RegistrationFile indicationsMof(const Registered& registered) {
+    std::string text = headLine("//", "brings the standard's indications into the repository.");
+    for (const RegisteredClass& each : registered.indications) {
+        const std::string name = each.name.substr(each.name.find('_'));
+        text += "\n[ Indication ]\nclass " + (kProviderName + name) + " : " + each.name + " {\n};\n";
+    }
+    return {"quenx-sfcb-indications.mof", text, isWrittenHere};
 }
 
 /// Adds the commands of the staging tool; the register goes with the first namespace.
@@ -50,7 +69,7 @@ void addStaging(std::vector<std::string>& commands, const char* tool, const Regi
     for (const std::string& name : registered.namespaces) {
         std::vector<std::string> words = {tool, "-n", name};
         if (std::exchange(isFirst, false)) words.insert(words.end(), {"-r", kRegister});
-        words.push_back(registered.mof.name);
+        words.insert(words.end(), {registered.mof.name, indicationsMof(registered).name});
         commands.push_back(joined(words, " "));
     }
     commands.emplace_back("sfcbrepos -f");
@@ -62,13 +81,14 @@ constexpr const char* kRestart = "Restart sfcb, when none of its providers is at
 
 Registration sfcbRegistration(const Registered& registered) {
     std::string text;
-    for (const RegisteredClass& each : registered.classes)
-        text += section(each, registered.namespaces);
+    for (const auto* classes : {&registered.classes, &registered.indications})
+        for (const RegisteredClass& each : *classes)
+            text += section(each, registered.namespaces);
     std::vector<std::string> steps = {
         "Have libQuenx_Cmpi.so in a folder that providerDirs of sfcb.cfg names."};
     addStaging(steps, "sfcbstage", registered);
     steps.emplace_back(kRestart);
-    return {{{kRegister, text, isOwnRegister}, registered.mof}, steps};
+    return {{{kRegister, text, isOwnRegister}, registered.mof, indicationsMof(registered)}, steps};
 }
 
 Registration sfcbRemoval(const Registered& registered) {
