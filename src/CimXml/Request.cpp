@@ -11,8 +11,25 @@ namespace {
 
 // Reading. Keys and arguments stay texts where the message states no type: the declaration knows better.
 
+void readProperty(const pugi::xml_node& element, InstanceBody& body) {
+    const bool isReference = isElement(element, "PROPERTY.REFERENCE");
+    const bool isArray = isElement(element, "PROPERTY.ARRAY");
+    if (!isReference && !isArray) expectElement(element, "PROPERTY");
+    const auto type = isReference ? std::optional(core::CimType::Reference) : readType(element, "TYPE");
+    core::PropertyValue& property = body.properties.emplace_back();
+    property.name = requiredAttribute(element, "NAME");
+    if (auto value = readValue(element, type, isArray, KeyTyping::Text)) {
+        property.value = std::move(*value);
+    } else if (body.mistypedProperty.empty()) {
+        body.mistypedProperty = property.name;
+    }
+}
+
 InstanceBody readInstanceBody(const pugi::xml_node& element) {
-    return {requiredAttribute(element, "CLASSNAME"), std::nullopt};
+    InstanceBody body{requiredAttribute(element, "CLASSNAME"), std::nullopt};
+    for (const pugi::xml_node& child : childElements(element))
+        if (!isElement(child, "QUALIFIER")) readProperty(child, body);
+    return body;
 }
 
 InstanceBody readNamedInstance(const pugi::xml_node& element) {
@@ -50,6 +67,16 @@ ParameterValue readParameterValue(const pugi::xml_node& element) {
     return std::move(object.path);
 }
 
+/// Paths may leave out the namespace that the call names.
+void completeNamespace(ParameterValue& value, const std::string& name) {
+    if (auto* path = std::get_if<core::CimPath>(&value)) path->completeNamespace(name);
+    auto* const body = std::get_if<InstanceBody>(&value);
+    if (body == nullptr) return;
+    if (body->path) body->path->completeNamespace(name);
+    for (core::PropertyValue& property : body->properties)
+        property.value.completeNamespace(name);
+}
+
 IntrinsicCall readIntrinsicCall(const pugi::xml_node& element) {
     IntrinsicCall call;
     call.operation = requiredAttribute(element, "NAME");
@@ -63,8 +90,7 @@ IntrinsicCall readIntrinsicCall(const pugi::xml_node& element) {
         // Some clients send each parameter and leave those empty that they do not use.
         if (childElements(children[i]).empty()) continue;
         parameter.value = readParameterValue(onlyChild(children[i]));
-        if (auto* path = std::get_if<core::CimPath>(&parameter.value))
-            path->completeNamespace(call.namespaceName);
+        completeNamespace(parameter.value, call.namespaceName);
     }
     return call;
 }
@@ -118,7 +144,7 @@ struct ParameterWriter {
     void operator()(const InstanceBody& body) const {
         if (body.path) writer.open("VALUE.NAMEDINSTANCE");
         if (body.path) writeInstanceName(writer, *body.path);
-        writer.start("INSTANCE").attribute("CLASSNAME", body.className).content().end("INSTANCE");
+        writeInstance(writer, {core::CimPath(body.className, {}), body.properties});
         if (body.path) writer.end("VALUE.NAMEDINSTANCE");
     }
 };

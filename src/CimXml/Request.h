@@ -19,11 +19,15 @@ struct ClassName {
     std::string name;
 };
 
-/// The instance that a client sends in order to create or modify one: only what names it is kept, since the
-/// classes served here are neither created nor modified from outside.
+/// The instance that a client sends in order to create or modify one.
 struct InstanceBody {
     std::string className;
     std::optional<core::CimPath> path;  ///< given with a modification
+    /// As the message types them; keys in references are texts.
+    std::vector<core::PropertyValue> properties = {};
+    /// The first property whose value is not of the type that it states; empty when there is none. Such an
+    /// instance can be read but not made, and its property is null.
+    std::string mistypedProperty = {};
 };
 
 /// What an intrinsic operation's parameter holds. Null is the same as a parameter that is not there.

@@ -17,6 +17,7 @@ enum class CimStatus {
     InvalidClass = 5,
     NotFound = 6,
     NotSupported = 7,
+    AlreadyExists = 11,
     NoSuchProperty = 12,
     TypeMismatch = 13,
     QueryLanguageNotSupported = 14,

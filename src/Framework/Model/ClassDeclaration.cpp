@@ -25,9 +25,15 @@ std::vector<QualifierDeclaration> makeDeclarations() {
     const Scopes valued{"PROPERTY", "METHOD", "PARAMETER"};
     // Scopes and flavors are those of the DMTF's qualifiers.mof, so that a client finds what it knows.
     return {
+        {.name = "Abstract",
+         .defaultValue = no,
+         .scopes = {"CLASS", "ASSOCIATION", "INDICATION"},
+         .isInherited = false},
         {.name = "Association", .defaultValue = no, .scopes = {"ASSOCIATION"}, .isOverridable = false},
         {.name = "Description", .defaultValue = noText, .scopes = qualifierScopes(), .isTranslatable = true},
+        {.name = "EmbeddedObject", .defaultValue = no, .scopes = valued, .isOverridable = false},
         {.name = "In", .defaultValue = yes, .scopes = {"PARAMETER"}, .isOverridable = false},
+        {.name = "Indication", .defaultValue = no, .scopes = {"CLASS", "INDICATION"}, .isOverridable = false},
         {.name = "Key", .defaultValue = no, .scopes = {"PROPERTY", "REFERENCE"}, .isOverridable = false},
         {.name = "Out", .defaultValue = no, .scopes = {"PARAMETER"}, .isOverridable = false},
         {.name = "Override",

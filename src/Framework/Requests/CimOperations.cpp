@@ -141,6 +141,21 @@ void CimOperations::streamInstances(const std::string& className, const Property
         AnswerMeter::tell(sink.take(instance));
 }
 
+// Most cannot. A client that is wrong about the class or the instance, too, hears that first.
+
+CimPath CimOperations::createInstance(const InstanceValue& instance) {
+    const std::string& className = instance.path.getClassName();
+    if (getClass(className).empty())
+        throw CimError(CimStatus::InvalidClass, "no class \"" + className + "\" in " + getNamespace());
+    throw CimError(CimStatus::NotSupported, "instances of " + className + " cannot be created");
+}
+
+void CimOperations::modifyInstance(const InstanceValue& instance, const PropertyFilter&) {
+    getInstance(instance.path, std::vector<std::string>());
+    throw CimError(CimStatus::NotSupported,
+                   "instances of " + instance.path.getClassName() + " cannot be modified");
+}
+
 const PropertyValue* InstanceValue::find(std::string_view name) const {
     return findByName(properties, name);
 }

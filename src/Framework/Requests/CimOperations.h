@@ -167,6 +167,14 @@ class QUENX_EXPORT CimOperations {
     /// NotSupported for a class whose instances cannot be deleted; else errors as getInstance().
     virtual void deleteInstance(const CimPath& path) = 0;
 
+    /// Makes an instance and returns its path. InvalidClass for an unknown class, NotSupported for one whose
+    /// instances cannot be made, InvalidParameter for properties that do not describe one.
+    /// @param instance  the class in its path; keys may be missing where the implementation can fill them in
+    virtual CimPath createInstance(const InstanceValue& instance);
+    /// Changes the properties that are given and, where there is a list, in it. NotSupported for those that
+    /// cannot be changed; else errors as getInstance().
+    virtual void modifyInstance(const InstanceValue& instance, const PropertyFilter& properties);
+
     /// The class first, its superclasses behind it; empty for an unknown class.
     virtual ClassChain getClass(const std::string& className) = 0;
     /// Each class that is served, is a superclass of one that is, or is named by a parameter, of those below

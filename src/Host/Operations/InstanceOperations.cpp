@@ -10,8 +10,6 @@ using cimxml::ResultKind;
 using core::CimError;
 using core::CimStatus;
 
-const core::PropertyFilter kNoProperties{std::vector<std::string>()};
-
 /// The properties of the named class only, narrowed by the client's list. Instances of subclasses are
 /// answered too, without the properties that the subclasses add (DSP0200 5.4.2.4).
 core::PropertyFilter shallowFilter(const core::ClassChain& chain, const core::PropertyFilter& wanted) {
@@ -64,6 +62,14 @@ core::CimPath sourceOf(const OperationContext& context, const Parameters& parame
     return parameters.path(name);
 }
 
+core::InstanceValue valueOf(const cimxml::InstanceBody& body, core::CimPath path) {
+    if (!body.mistypedProperty.empty()) {
+        throw CimError(CimStatus::TypeMismatch,
+                       "property " + body.mistypedProperty + " does not hold a value of its stated type");
+    }
+    return {std::move(path), body.properties};
+}
+
 core::AssociationFilter filterOf(const Parameters& parameters) {
     return {parameters.className("AssocClass"), parameters.className("ResultClass"), parameters.text("Role"),
             parameters.text("ResultRole")};
@@ -100,21 +106,17 @@ IntrinsicResult deleteInstance(const OperationContext& context, const Parameters
     return {};
 }
 
-// Clients cannot create or modify anything here. One that is wrong about the class or the instance, too,
-// hears that first, as it would from a server that can.
-
 IntrinsicResult createInstance(const OperationContext& context, const Parameters& parameters) {
-    const std::string& className = parameters.instance("NewInstance").className;
-    requireClass(context.target, className, CimStatus::InvalidClass);
-    throw CimError(CimStatus::NotSupported, "instances of " + className + " cannot be created");
+    const cimxml::InstanceBody& body = parameters.instance("NewInstance");
+    return {.kind = ResultKind::InstanceNames,
+            .paths = {context.target.createInstance(valueOf(body, core::CimPath(body.className, {})))}};
 }
 
 IntrinsicResult modifyInstance(const OperationContext& context, const Parameters& parameters) {
     const cimxml::InstanceBody& body = parameters.instance("ModifiedInstance");
     if (!body.path) throw CimError(CimStatus::InvalidParameter, "ModifiedInstance names no instance");
-    context.target.getInstance(*body.path, kNoProperties);
-    throw CimError(CimStatus::NotSupported,
-                   "instances of " + body.path->getClassName() + " cannot be modified");
+    context.target.modifyInstance(valueOf(body, *body.path), parameters.list("PropertyList"));
+    return {};
 }
 
 IntrinsicResult associators(const OperationContext& context, const Parameters& parameters) {
