@@ -91,6 +91,16 @@ std::optional<Network> networkIn(const std::string& text) {
     return Network{*address, static_cast<int>(*bits) + (isIpv4 ? kIpv4Bits : 0)};
 }
 
+void OwnPorts::add(std::uint16_t port) {
+    const std::lock_guard lock(m_mutex);
+    m_ports.push_back(port);
+}
+
+bool OwnPorts::has(std::uint16_t port) const {
+    const std::lock_guard lock(m_mutex);
+    return std::ranges::find(m_ports, port) != m_ports.end();
+}
+
 AddressPolicy AddressPolicy::onlyTo(const MachineAddress& subscriber) {
     AddressPolicy policy;
     policy.m_networks.push_back({subscriber, 128});
@@ -117,6 +127,7 @@ bool AddressPolicy::allows(const sockaddr& address) const {
     if (!parts || !isOneOtherMachine(parts->first)) return false;
     const auto& [machine, port] = *parts;
     if (port < kFirstFreePort && port != 80 && port != 443 && !m_isList) return false;
+    if (m_ownPorts != nullptr && m_ownPorts->has(port) && !m_isList) return false;
     if (m_isAnywhere) return !isLoopback(machine);
     // A network that holds all of the world does not mean this machine.
     const bool isNamed = isInAny(machine, m_networks);

@@ -6,6 +6,8 @@
 
 #include <array>
 #include <cstdint>
+#include <memory>
+#include <mutex>
 #include <optional>
 #include <string>
 #include <vector>
@@ -29,6 +31,17 @@ struct Network {
 /// The network in a text: "192.0.2.0/24", "2001:db8::/32", or one address. Nothing for a text that is none.
 std::optional<Network> networkIn(const std::string& text);
 
+/// The ports that this process listens on itself, which may become known late. Thread-safe.
+class OwnPorts {
+  public:
+    void add(std::uint16_t port);
+    bool has(std::uint16_t port) const;
+
+  private:
+    mutable std::mutex m_mutex;
+    std::vector<std::uint16_t> m_ports;
+};
+
 /// To which machines indications may go. It looks at the address that a connection is about to be made to,
 /// since a name can stand for any address, and for another one the next time. A value.
 class AddressPolicy {
@@ -41,6 +54,10 @@ class AddressPolicy {
     /// All but loopback.
     static AddressPolicy anywhere();
 
+    /// Nothing goes to these ports, unless a list of networks says where.
+    /// @param ports  null for none
+    void deny(std::shared_ptr<const OwnPorts> ports) { m_ownPorts = std::move(ports); }
+
     /// Whether a connection may go there. Never to addresses that name no single other machine (unspecified,
     /// multicast, broadcast) nor to those of the link (169.254.0.0/16, fe80::/10), where machines in a cloud
     /// keep their secrets; and below port 1024 to 80 and 443 only, unless a list of networks says where.
@@ -48,6 +65,7 @@ class AddressPolicy {
 
   private:
     std::vector<Network> m_networks;
+    std::shared_ptr<const OwnPorts> m_ownPorts;
     bool m_isList = false;
     bool m_isAnywhere = false;
 };

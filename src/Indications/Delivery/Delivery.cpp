@@ -6,6 +6,7 @@
 #include <mutex>
 #include <vector>
 
+#include "Indications/Delivery/Pace.h"
 #include "Indications/Delivery/Transfer.h"
 #include "Utils/Exception.h"
 #include "Utils/Log.h"
@@ -33,6 +34,7 @@ struct Target {
     std::string url;
     AddressPolicy policy;
     Queue queue;
+    std::string address = {};  ///< where it was last
 };
 
 }  // namespace
@@ -96,6 +98,7 @@ class Delivery::Courier : public utils::Thread {
     const Multi m_multi;
     mutable std::mutex m_mutex;  ///< for the targets and their queues; held for moments
     std::map<std::string, std::shared_ptr<Target>> m_targets;
+    Pace m_pace{m_settings.perSecond};
     // The thread's own.
     std::vector<UnderWay> m_underWay;
     std::string m_last;  ///< to which something was sent
@@ -118,6 +121,7 @@ bool Delivery::Courier::begin(const std::string& destination, const std::shared_
     const bool toFailing = target->queue.counters().isFailing;
     const auto failing = std::ranges::count_if(m_underWay, [](const auto& each) { return each.toFailing; });
     if (toFailing && static_cast<std::size_t>(failing) >= kMostToFailing) return false;
+    if (m_pace.next(target->address) > Clock::now()) return false;
     const Message* const message = target->queue.begin(Clock::now());
     if (message == nullptr) return false;
     try {
@@ -149,6 +153,8 @@ void Delivery::Courier::end(UnderWay& done, CURLcode code) {
     bool isFailing = false;
     {
         const std::lock_guard lock(m_mutex);
+        done.target->address = done.transfer->address();
+        m_pace.count(done.target->address, Clock::now());
         Queue& queue = done.target->queue;
         wasFailing = queue.counters().isFailing;
         queue.end(result.outcome, m_settings, Clock::now());
@@ -184,7 +190,8 @@ int Delivery::Courier::pause() const {
     auto shortest = kLongest;
     const auto now = Clock::now();
     for (const auto& [name, target] : m_targets) {
-        const auto due = target->queue.due();
+        auto due = target->queue.due();
+        if (due) due = std::max(*due, m_pace.next(target->address));
         // What is due already waits for a transfer to end.
         if (due && *due > now)
             shortest = std::min(shortest, std::chrono::ceil<std::chrono::milliseconds>(*due - now));

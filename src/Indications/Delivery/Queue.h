@@ -20,11 +20,12 @@ struct DeliverySettings {
     std::chrono::milliseconds connectTime{5'000};
     std::chrono::milliseconds wholeTime{10'000};    ///< of one try
     std::chrono::milliseconds farewellTime{2'000};  ///< for what is under way at the end
-    std::size_t mostWaiting = 256;                  ///< messages of one destination
-    std::size_t mostBytes = 1 << 20;                ///< of them
-    std::size_t mostBytesOfAll = 8 << 20;
-    std::string certificates;  ///< a file of authorities beside the system's; empty for none
-    bool verifies = true;      ///< false takes any certificate
+    std::size_t mostWaiting = 1024;                 ///< messages of one destination
+    std::size_t mostBytes = 8 << 20;                ///< of them
+    std::size_t mostBytesOfAll = 32 << 20;
+    unsigned int perSecond = 0;  ///< messages to one address, on average; 0 sets no bound
+    std::string certificates;    ///< a file of authorities beside the system's; empty for none
+    bool verifies = true;        ///< false takes any certificate
 };
 
 /// What has become of a destination's messages.

@@ -109,6 +109,12 @@ Transfer::Result Transfer::result(CURLcode code) const {
     return resultOfAnswer();
 }
 
+std::string Transfer::address() const {
+    const char* address = nullptr;
+    ::curl_easy_getinfo(m_curl.get(), CURLINFO_PRIMARY_IP, &address);
+    return address == nullptr ? "" : address;
+}
+
 Transfer::Result Transfer::resultOfAnswer() const {
     long status = 0;
     ::curl_easy_getinfo(m_curl.get(), CURLINFO_RESPONSE_CODE, &status);

@@ -30,6 +30,8 @@ class Transfer {
     };
     /// @param code  how the transfer ended
     Result result(CURLcode code) const;
+    /// To which it went, once it has ended; empty where there was no connection.
+    std::string address() const;
 
   private:
     template <class Value>

@@ -1,0 +1,31 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include <functional>
+#include <string>
+
+#include "Indications/Subscriptions/Records.h"
+
+namespace indications {
+
+/// The file in which subscriptions outlive the daemon: JSON, its version first, replaced as a whole with each
+/// change. Used by one thread at a time.
+class StateFile {
+  public:
+    /// @param path  empty: nothing is kept
+    explicit StateFile(std::string path) : m_path(std::move(path)) {}
+
+    /// What was written last; nothing where there is no file. A file that cannot be used is renamed, with a
+    /// line in the log; where that fails, too, nothing is written over it.
+    Records read();
+    /// Writes all but the server's own. CimError (failed) when it cannot be: the old file is as it was.
+    void write(const Records& records);
+
+    bool isKept() const { return !m_path.empty(); }
+
+  private:
+    const std::string m_path;
+    std::string m_obstacle;  ///< why nothing may be written
+};
+
+}  // namespace indications
