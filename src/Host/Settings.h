@@ -71,6 +71,19 @@ struct UploadSettings {
     std::size_t totalBytes = 1U << 30;                ///< of all; beyond it the oldest go
 };
 
+/// Who is told of events, and how.
+struct IndicationSettings {
+    std::string file = "/var/lib/quenx/subscriptions.json";  ///< keeps them; empty: none outlives the daemon
+    /// "subscriber" alone or nothing at all: the machine that subscribed; "any"; else networks.
+    std::vector<std::string> destinations;
+    std::size_t most = 100;    ///< destinations, and subscriptions
+    std::string certificates;  ///< a file of authorities beside the system's; empty: none
+    bool verify = true;        ///< the certificates of listeners
+    unsigned int retries = 3;  ///< tries after the first
+    std::chrono::seconds retryTime{30};
+    unsigned int perSecond = 20;  ///< messages to one address; 0 sets no bound
+};
+
 /// What the configuration file and the options say. Field by field documented in packaging/quenx-cimd.toml.
 struct Settings {
     ListenSettings listen;
@@ -80,6 +93,7 @@ struct Settings {
     PullLimits pulls;
     JobSettings jobs;
     UploadSettings uploads;
+    IndicationSettings indications;
     std::string providers;              ///< directory of the provider libraries
     std::string providerConfiguration;  ///< empty: the providers' own default
     std::string policy;                 ///< file of the policy; empty: the machine's

@@ -33,6 +33,7 @@ RunningDaemon::RunningDaemon(const std::vector<std::string>& options,
                                                          {"--adapters-description", "adapters.toml"},
                                                          {"--adapters-state", "state"},
                                                          {"--uploads-directory", "images"},
+                                                         {"--indications-file", "subscriptions.json"},
                                                          {"--daemon-lock-file", "lock"}};
     for (const auto& [option, file] : files)
         command.insert(command.end(), {option, m_folder / file});

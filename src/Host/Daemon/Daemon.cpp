@@ -10,6 +10,7 @@
 #include "Framework/Classes/CimBroker.h"
 #include "Framework/Classes/InstanceList.h"
 #include "History/Log/LogAgent.h"
+#include "Host/Daemon/IndicationSettings.h"
 #include "Host/Daemon/Report.h"
 #include "Host/Operations/Dispatcher.h"
 #include "Host/Operations/InteropNamespace.h"
@@ -112,6 +113,8 @@ Daemon::Daemon(const Settings& settings)
     : m_settings(settings),
       m_lock(settings.lockFile),
       m_history(history::History::wanted()),
+      m_events(std::make_shared<indications::EventQueue>()),
+      m_ownPorts(std::make_shared<indications::OwnPorts>()),
       m_session(settings.providerConfiguration, settings.policy) {
     m_lock.require();
     reportPolicy();
@@ -120,12 +123,14 @@ Daemon::Daemon(const Settings& settings)
     // Before the providers come, which ask for the adapters as soon as they are called.
     selectAdapters(m_settings);
     m_session.keepHistory(m_history);
+    m_session.tellEvents(m_events);
     // Whoever died in an update cannot tell any more how it ended.
     if (m_history) m_history->look();
     loadProviders(m_session.libraries(), m_settings.providers);
     history::serveLog(m_session, m_history);
     openSpool();
     m_retention.emplace(m_settings.jobs, m_session.operations());
+    m_subscriptions = makeSubscriptions();
     m_dispatcher = makeDispatcher();
     m_authentication = makeAuthentication();
     m_control.emplace(m_session.operations(), m_trail, *m_spool);
@@ -136,17 +141,32 @@ Daemon::Daemon(const Settings& settings)
 
 Daemon::~Daemon() = default;
 
-std::unique_ptr<Dispatcher> Daemon::makeDispatcher() const {
-    const auto implementation = m_session.operations();
-    Dispatcher::Namespaces namespaces{implementation};
-    std::vector<std::string> names{implementation->getNamespace()};
+std::vector<std::string> Daemon::namespaces() const {
+    std::vector<std::string> names{m_session.operations()->getNamespace()};
     // Clients look for the registered profiles under either name (DSP1033 7.1), and few try both.
     for (const char* name : {"interop", "root/interop"}) {
         if (!core::sameName(name, names.front())) names.emplace_back(name);
     }
+    return names;
+}
+
+std::shared_ptr<indications::Subscriptions> Daemon::makeSubscriptions() const {
+    indications::SubscriptionSettings settings = subscriptionSettings(m_settings);
+    settings.ownPorts = m_ownPorts;
+    auto made = std::make_shared<indications::Subscriptions>(
+        std::move(settings), namespaces(), os::getHostname(), m_session.operations(), m_events);
+    made->resume();
+    return made;
+}
+
+std::unique_ptr<Dispatcher> Daemon::makeDispatcher() const {
+    const auto implementation = m_session.operations();
+    Dispatcher::Namespaces namespaces{implementation};
+    const std::vector<std::string> names = this->namespaces();
     const InteropModel model(names, os::getHostname());
     for (std::size_t i = 1; i < names.size(); ++i)
-        namespaces.push_back(std::make_shared<InteropNamespace>(names[i], implementation, model));
+        namespaces.push_back(
+            std::make_shared<InteropNamespace>(names[i], implementation, model, m_subscriptions));
     return std::make_unique<Dispatcher>(std::move(namespaces), m_settings.pulls,
                                         m_settings.limits.answerBytes, m_trail);
 }
@@ -178,6 +198,7 @@ void Daemon::openSpool() {
 void Daemon::listenOn(std::uint16_t port, bool tls) {
     const std::string& address = m_settings.listen.address;
     const std::uint16_t actualPort = m_server->listen(address, port, tls);
+    m_ownPorts->add(actualPort);
     if (!m_addresses.empty()) m_addresses += " ";
     m_addresses += tls ? "https://" : "http://";
     // An IPv6 address stands in brackets in a URL (RFC 3986 3.2.2).

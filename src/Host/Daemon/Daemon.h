@@ -16,6 +16,12 @@
 #include "MidAPI/AdapterTypes.h"
 #include "Utils/Os/Linux/FileLock.h"
 
+namespace indications {
+class EventQueue;
+class OwnPorts;
+class Subscriptions;
+}  // namespace indications
+
 namespace host {
 
 /// Whether the file is in the folder of the default lock file and socket, which a start makes.
@@ -80,6 +86,9 @@ class Daemon {
     std::unique_ptr<Dispatcher> makeDispatcher() const;
     std::unique_ptr<Authentication> makeAuthentication() const;
     void openSpool();
+    std::shared_ptr<indications::Subscriptions> makeSubscriptions() const;
+    /// That of the providers first.
+    std::vector<std::string> namespaces() const;
     void readCertificate();
     /// A bad policy stops no reader; the session logs it.
     void reportPolicy();
@@ -91,7 +100,11 @@ class Daemon {
     std::string m_addresses;
     // Destroyed last to first: the server lets go of its requests before the providers leave.
     const std::shared_ptr<history::History> m_history;  ///< null where none is wanted
+    const std::shared_ptr<indications::EventQueue> m_events;
+    const std::shared_ptr<indications::OwnPorts> m_ownPorts;
     core::ProviderSession m_session;
+    /// Leaves before the providers: what it is told of is theirs.
+    std::shared_ptr<indications::Subscriptions> m_subscriptions;
     std::optional<JobRetention> m_retention;
     const std::shared_ptr<AuditTrail> m_trail = std::make_shared<AuditTrail>();
     std::unique_ptr<Dispatcher> m_dispatcher;

@@ -4,6 +4,7 @@
 #include <algorithm>
 #include <stdexcept>
 
+#include "Host/Daemon/IndicationSettings.h"
 #include "Utils/Utils.h"
 
 namespace host {
@@ -118,6 +119,20 @@ std::vector<SettingsField> otherFields(Settings& s) {
         {"uploads.image_bytes", &s.uploads.imageBytes, "largest image that is sent", 1024, 2 * kGibibyte - 1},
         {"uploads.total_bytes", &s.uploads.totalBytes,
          "most for all images that were sent; beyond it the oldest are removed", 1024, kGibibyte * 1024},
+        {"indications.destinations", &s.indications.destinations,
+         "where indications may go: subscriber, the machine that subscribed; any; or networks, such as "
+         "10.0.0.0/8",
+         1, 0, true},
+        {"indications.file", &s.indications.file,
+         "file that keeps subscriptions over restarts; empty to keep none"},
+        {"indications.most", &s.indications.most, "most destinations, and most subscriptions", 1, 1000},
+        {"indications.certificates", &s.indications.certificates,
+         "file with authorities for certificates of listeners, beside the system's"},
+        {"indications.verify", &s.indications.verify, "check the certificates of listeners"},
+        {"indications.retries", &s.indications.retries, "further tries after one that failed", 0, 100},
+        {"indications.retry_seconds", &s.indications.retryTime, "time between two tries", 1, kDay},
+        {"indications.per_second", &s.indications.perSecond,
+         "most indications in a second to one address, on average; 0 for no bound", 0, 100000},
         {"providers.directory", &s.providers, "directory of the provider libraries"},
         {"providers.configuration", &s.providerConfiguration,
          "the providers' own configuration file, instead of /etc/quenx-cimprovider.conf"},
@@ -183,6 +198,7 @@ void checkSettings(const Settings& s) {
     refuseIf(s.uploads.imageBytes > s.uploads.totalBytes,
              "uploads.image_bytes is larger than uploads.total_bytes. Lower it, or raise "
              "uploads.total_bytes.");
+    subscriptionSettings(s);
     refuseIf(s.adapters.empty() != s.adapterState.empty(),
              "Only one of adapters.description and adapters.state is set. Set both, or neither.");
 }

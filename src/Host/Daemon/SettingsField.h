@@ -22,6 +22,7 @@ struct SettingsField {
     std::string help;
     std::uint64_t least = 0;  ///< of a number; of a text, characters
     std::uint64_t most = 0;   ///< of a number
+    bool takesOne = false;    ///< of a list: its one text may stand for it
 
     std::string option() const;
     bool isFlag() const { return std::holds_alternative<bool*>(target); }

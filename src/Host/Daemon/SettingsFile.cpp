@@ -30,6 +30,7 @@ std::string textOf(const SettingsField& field, const toml::node& node) {
 void setList(const SettingsField& field, const toml::node& node) {
     // An empty list has to be able to take everybody off.
     std::get<std::vector<std::string>*>(field.target)->clear();
+    if (field.takesOne && node.is_string()) return field.set(textOf(field, node));
     const toml::array* elements = node.as_array();
     if (elements == nullptr)
         throw std::runtime_error(field.key + " must be a list of texts, such as [\"alice\"]");

@@ -2,6 +2,7 @@
 // What the object manager serves of itself: CIM_ObjectManager, and one CIM_Namespace for each namespace. No
 // provider has these classes, so they are declared here, with the properties that are filled in alone.
 #include "Host/Operations/InteropNamespace.h"
+#include "Indications/Subscriptions/Classes.h"
 
 namespace host {
 
@@ -48,6 +49,8 @@ std::vector<core::ClassDeclaration> declarations() {
                 {key("SystemCreationClassName"), key("SystemName"), key("ObjectManagerCreationClassName"),
                  key("ObjectManagerName"), key("CreationClassName"), key("Name"),
                  property("ClassInfo", CimType::Uint16)})};
+    for (core::ClassDeclaration& each : indications::subscriptionClasses())
+        all.push_back(std::move(each));
     for (core::ClassDeclaration& each : all)
         core::addImpliedQualifiers(each);
     return all;

@@ -3,9 +3,11 @@
 
 #include <algorithm>
 #include <array>
+#include <iterator>
 
 #include "Framework/Requests/CimOperations.h"
 #include "Host/Operations/Operations.h"
+#include "Indications/Subscriptions/Subscriptions.h"
 
 namespace host {
 
@@ -28,14 +30,29 @@ InstanceValue filtered(InstanceValue instance, const core::PropertyFilter& filte
     return instance;
 }
 
+std::vector<CimPath> pathsOf(std::vector<InstanceValue> instances) {
+    std::vector<CimPath> paths;
+    for (InstanceValue& instance : instances)
+        paths.push_back(std::move(instance.path));
+    return paths;
+}
+
+/// To the operations for references the association is the result.
+core::AssociationFilter asReferences(const core::AssociationFilter& by) {
+    return {by.associationClass.empty() ? by.resultClass : by.associationClass, "", by.role, ""};
+}
+
 }  // namespace
 
 InteropNamespace::InteropNamespace(std::string name, std::shared_ptr<core::CimOperations> implementation,
-                                   InteropModel model)
-    : m_name(std::move(name)), m_implementation(std::move(implementation)), m_model(std::move(model)) {
-    for (InstanceValue& own : m_model.instances)
-        own.path.setNamespace(m_name);
-}
+                                   InteropModel model,
+                                   std::shared_ptr<indications::Subscriptions> subscriptions)
+    : m_name(std::move(name)),
+      m_implementation(std::move(implementation)),
+      m_model(std::move(model)),
+      m_subscriptions(std::move(subscriptions)) {}
+
+InteropNamespace::~InteropNamespace() = default;
 
 core::ClassChain InteropNamespace::findOwnClass(const std::string& className) const {
     const auto found = std::find_if(
@@ -46,6 +63,23 @@ core::ClassChain InteropNamespace::findOwnClass(const std::string& className) co
 
 CimPath InteropNamespace::typedOwnPath(const CimPath& path) const {
     return core::typedPath(path, [this](const std::string& name) { return findOwnClass(name); });
+}
+
+bool InteropNamespace::isOfSubscriptions(const CimPath& path) const {
+    return m_subscriptions != nullptr && m_subscriptions->serves(path.getClassName());
+}
+
+InstanceValue InteropNamespace::placed(InstanceValue instance) const {
+    instance.path.completeNamespace(m_name);
+    for (core::PropertyValue& property : instance.properties)
+        property.value.completeNamespace(m_name);
+    return instance;
+}
+
+std::vector<InstanceValue> InteropNamespace::ownInstances() const {
+    std::vector<InstanceValue> all = m_model.instances;
+    if (m_subscriptions != nullptr) std::ranges::move(m_subscriptions->instances(), std::back_inserter(all));
+    return all;
 }
 
 bool InteropNamespace::isShown(const core::ClassChain& chain) const {
@@ -99,9 +133,9 @@ std::vector<InstanceValue> InteropNamespace::enumerateInstances(const std::strin
                                                                 const core::PropertyFilter& filter) {
     requireClass(*this, className, core::CimStatus::InvalidClass);
     std::vector<InstanceValue> result;
-    for (const InstanceValue& own : m_model.instances) {
+    for (const InstanceValue& own : ownInstances()) {
         if (core::derivesFrom(findOwnClass(own.path.getClassName()), className))
-            result.push_back(filtered(own, filter));
+            result.push_back(filtered(placed(own), filter));
     }
     for (const std::string& source : sources(className)) {
         for (InstanceValue& instance : relocated(m_implementation->enumerateInstances(source, filter)))
@@ -111,10 +145,7 @@ std::vector<InstanceValue> InteropNamespace::enumerateInstances(const std::strin
 }
 
 std::vector<CimPath> InteropNamespace::enumerateInstanceNames(const std::string& className) {
-    std::vector<CimPath> paths;
-    for (InstanceValue& instance : enumerateInstances(className, kNoProperties))
-        paths.push_back(std::move(instance.path));
-    return paths;
+    return pathsOf(enumerateInstances(className, kNoProperties));
 }
 
 InstanceValue InteropNamespace::getInstance(const CimPath& path, const core::PropertyFilter& filter) {
@@ -124,8 +155,9 @@ InstanceValue InteropNamespace::getInstance(const CimPath& path, const core::Pro
         return instance;
     }
     const CimPath typed = typedOwnPath(path);
-    for (const InstanceValue& own : m_model.instances) {
-        if (own.path.isSameObjectAs(typed)) return filtered(own, filter);
+    if (isOfSubscriptions(path)) return filtered(placed(m_subscriptions->get(typed)), filter);
+    for (const InstanceValue& own : ownInstances()) {
+        if (placed(own).path.isSameObjectAs(typed)) return filtered(placed(own), filter);
     }
     throw core::CimError(core::CimStatus::NotFound, core::shownPath(path) + " names no instance");
 }
@@ -143,15 +175,48 @@ bool InteropNamespace::hasAssociations(const CimPath& path, const core::Associat
     return false;
 }
 
+std::vector<InstanceValue> InteropNamespace::subscriptionsOf(const CimPath& path,
+                                                             const core::AssociationFilter& by) const {
+    std::vector<InstanceValue> found = m_subscriptions->referring(path);
+    std::erase_if(found, [&](const InstanceValue& subscription) {
+        if (!by.associationClass.empty() &&
+            !core::derivesFrom(findOwnClass(subscription.path.getClassName()), by.associationClass))
+            return true;
+        if (by.role.empty()) return false;
+        const auto end = subscription.get<CimPath>(by.role);
+        return !end || !core::sameName(end->getClassName(), path.getClassName());
+    });
+    for (InstanceValue& each : found)
+        each = placed(std::move(each));
+    return found;
+}
+
 std::vector<InstanceValue> InteropNamespace::associators(const CimPath& path,
                                                          const core::AssociationFilter& by,
                                                          const core::PropertyFilter& filter) {
-    if (!hasAssociations(path, by)) return {};
+    const bool leads = hasAssociations(path, by);
+    if (isOfSubscriptions(path)) {
+        std::vector<InstanceValue> found;
+        for (const InstanceValue& subscription : subscriptionsOf(path, by)) {
+            for (const core::CimKey& end : subscription.path.getKeys()) {
+                const auto& other = std::get<CimPath>(end.value);
+                if (core::sameName(other.getClassName(), path.getClassName())) continue;
+                if (!by.resultRole.empty() && !core::sameName(end.name, by.resultRole)) continue;
+                if (!by.resultClass.empty() &&
+                    !core::derivesFrom(findOwnClass(other.getClassName()), by.resultClass))
+                    continue;
+                found.push_back(getInstance(other, filter));
+            }
+        }
+        return found;
+    }
+    if (!leads) return {};
     return relocated(m_implementation->associators(atProviders(path), by, filter));
 }
 
 std::vector<CimPath> InteropNamespace::associatorNames(const CimPath& path,
                                                        const core::AssociationFilter& by) {
+    if (isOfSubscriptions(path)) return pathsOf(associators(path, by, kNoProperties));
     if (!hasAssociations(path, by)) return {};
     return relocated(m_implementation->associatorNames(atProviders(path), by));
 }
@@ -159,12 +224,20 @@ std::vector<CimPath> InteropNamespace::associatorNames(const CimPath& path,
 std::vector<InstanceValue> InteropNamespace::references(const CimPath& path,
                                                         const core::AssociationFilter& by,
                                                         const core::PropertyFilter& filter) {
-    if (!hasAssociations(path, by)) return {};
+    const bool leads = hasAssociations(path, by);
+    if (isOfSubscriptions(path)) {
+        std::vector<InstanceValue> found;
+        for (InstanceValue& each : subscriptionsOf(path, asReferences(by)))
+            found.push_back(filtered(std::move(each), filter));
+        return found;
+    }
+    if (!leads) return {};
     return relocated(m_implementation->references(atProviders(path), by, filter));
 }
 
 std::vector<CimPath> InteropNamespace::referenceNames(const CimPath& path,
                                                       const core::AssociationFilter& by) {
+    if (isOfSubscriptions(path)) return pathsOf(references(path, by, kNoProperties));
     if (!hasAssociations(path, by)) return {};
     return relocated(m_implementation->referenceNames(atProviders(path), by));
 }
@@ -178,8 +251,21 @@ core::MethodResult InteropNamespace::invokeMethod(const CimPath& path, const std
 void InteropNamespace::deleteInstance(const CimPath& path) {
     // A client that is wrong about the instance hears that first.
     getInstance(path, kNoProperties);
+    if (isOfSubscriptions(path)) return m_subscriptions->remove(typedOwnPath(path));
     throw core::CimError(core::CimStatus::NotSupported,
                          "instances of " + path.getClassName() + " cannot be deleted");
+}
+
+CimPath InteropNamespace::createInstance(const InstanceValue& instance) {
+    if (!isOfSubscriptions(instance.path)) return CimOperations::createInstance(instance);
+    CimPath path = m_subscriptions->create(instance);
+    path.completeNamespace(m_name);
+    return path;
+}
+
+void InteropNamespace::modifyInstance(const InstanceValue& instance, const core::PropertyFilter& properties) {
+    if (!isOfSubscriptions(instance.path)) return CimOperations::modifyInstance(instance, properties);
+    m_subscriptions->modify({typedOwnPath(instance.path), instance.properties}, properties);
 }
 
 core::ClassChain InteropNamespace::getClass(const std::string& className) {

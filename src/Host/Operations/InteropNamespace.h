@@ -5,6 +5,10 @@
 
 #include "Framework/Requests/CimOperations.h"
 
+namespace indications {
+class Subscriptions;
+}
+
 namespace host {
 
 /// What the object manager serves of itself: its own instance, and one for each namespace.
@@ -19,11 +23,13 @@ struct InteropModel {
 /// The namespace in which a client finds out what is served: the object manager, the namespaces, and the
 /// registered profiles with what conforms to them and what they refer to. The profiles come from the
 /// providers; here their paths are in this namespace, while those of the elements that conform to them are in
-/// the implementation namespace, where a client goes on.
+/// the implementation namespace, where a client goes on. Here clients subscribe to indications, too.
 class InteropNamespace : public core::CimOperations {
   public:
+    /// @param subscriptions  null where nobody can subscribe
     InteropNamespace(std::string name, std::shared_ptr<core::CimOperations> implementation,
-                     InteropModel model);
+                     InteropModel model, std::shared_ptr<indications::Subscriptions> subscriptions = nullptr);
+    ~InteropNamespace() override;
 
     const std::string& getNamespace() const override { return m_name; }
     std::vector<core::InstanceValue> enumerateInstances(const std::string& className,
@@ -42,12 +48,22 @@ class InteropNamespace : public core::CimOperations {
     core::MethodResult invokeMethod(const core::CimPath& path, const std::string& method,
                                     const std::vector<core::Argument>& arguments) override;
     void deleteInstance(const core::CimPath& path) override;
+    /// Of what clients subscribe with.
+    core::CimPath createInstance(const core::InstanceValue& instance) override;
+    void modifyInstance(const core::InstanceValue& instance, const core::PropertyFilter& properties) override;
     core::ClassChain getClass(const std::string& className) override;
     std::vector<core::ClassChain> enumerateClasses(const std::string& className, bool deep) override;
 
   private:
     core::ClassChain findOwnClass(const std::string& className) const;
     core::CimPath typedOwnPath(const core::CimPath& path) const;
+    bool isOfSubscriptions(const core::CimPath& path) const;
+    std::vector<core::InstanceValue> ownInstances() const;
+    /// As it stands in this namespace.
+    core::InstanceValue placed(core::InstanceValue instance) const;
+    /// The subscriptions that refer to the path, as far as the filter lets them through.
+    std::vector<core::InstanceValue> subscriptionsOf(const core::CimPath& path,
+                                                     const core::AssociationFilter& by) const;
     /// Whether the providers' class is shown here.
     bool isShown(const core::ClassChain& chain) const;
     /// The providers' classes to enumerate for the instances of a class here.
@@ -72,6 +88,7 @@ class InteropNamespace : public core::CimOperations {
     const std::string m_name;
     const std::shared_ptr<core::CimOperations> m_implementation;
     InteropModel m_model;
+    const std::shared_ptr<indications::Subscriptions> m_subscriptions;
 };
 
 }  // namespace host
