@@ -33,7 +33,7 @@ class Listening {
     // The calls of the object manager, each for every class that it has registered. What ends something never
     // waits for an indication that is on its way: the object manager may take it only after the call.
 
-    /// Both need an open session. @throws core::CimError, and then there is one filter, or enabling, less
+    /// Both need an open session. @throws core::CimError, and then nothing has changed
     void activate(const Context* context, const FilterPlace& filter);
     void enable(const Context* context);
     /// @param isLast  of those with this class and namespace
