@@ -3,6 +3,7 @@
 
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <csignal>
 #include <filesystem>
 #include <sstream>
@@ -35,8 +36,11 @@ RunningDaemon::RunningDaemon(const std::vector<std::string>& options,
                                                          {"--uploads-directory", "images"},
                                                          {"--indications-file", "subscriptions.json"},
                                                          {"--daemon-lock-file", "lock"}};
-    for (const auto& [option, file] : files)
-        command.insert(command.end(), {option, m_folder / file});
+    for (const auto& [option, file] : files) {
+        // A test may name its own.
+        if (std::find(options.begin(), options.end(), option) == options.end())
+            command.insert(command.end(), {option, m_folder / file});
+    }
     command.insert(command.end(), options.begin(), options.end());
     m_program = std::make_unique<Program>(command, Program::Output::Terminal, environment);
     EXPECT_TRUE(m_program->waitFor("Serving http")) << "the daemon does not start: " << m_program->seen();

@@ -1,5 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Host/Operations/Operations.h"
+#include "Indications/Subscriptions/Subscriptions.h"
 
 namespace host {
 
@@ -108,6 +109,11 @@ IntrinsicResult deleteInstance(const OperationContext& context, const Parameters
 
 IntrinsicResult createInstance(const OperationContext& context, const Parameters& parameters) {
     const cimxml::InstanceBody& body = parameters.instance("NewInstance");
+    if (indications::Subscriptions::serves(body.className) &&
+        context.target.getClass(body.className).empty()) {
+        throw CimError(CimStatus::NotSupported,
+                       "subscriptions are not made in " + context.target.getNamespace() + ", but in interop");
+    }
     return {.kind = ResultKind::InstanceNames,
             .paths = {context.target.createInstance(valueOf(body, core::CimPath(body.className, {})))}};
 }

@@ -66,7 +66,7 @@ CimPath InteropNamespace::typedOwnPath(const CimPath& path) const {
 }
 
 bool InteropNamespace::isOfSubscriptions(const CimPath& path) const {
-    return m_subscriptions != nullptr && m_subscriptions->serves(path.getClassName());
+    return m_subscriptions != nullptr && indications::Subscriptions::serves(path.getClassName());
 }
 
 InstanceValue InteropNamespace::placed(InstanceValue instance) const {

@@ -177,7 +177,7 @@ void Subscriptions::accept(Records& all, Records kept) {
     }
 }
 
-bool Subscriptions::serves(std::string_view className) const {
+bool Subscriptions::serves(std::string_view className) {
     return core::sameName(className, kFilter) || core::sameName(className, kSubscription) ||
            isDestination(className);
 }

@@ -51,7 +51,7 @@ class Subscriptions {
     void resume();
 
     /// Whether instances of the class can be made, of ours only.
-    bool serves(std::string_view className) const;
+    static bool serves(std::string_view className);
 
     std::vector<core::InstanceValue> instances() const;
     /// CimError (not found) where there is none. A path may name the system as it likes.
