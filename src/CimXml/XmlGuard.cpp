@@ -15,16 +15,34 @@ namespace {
 
 constexpr std::string_view kBlanks = " \t\r\n";
 
-bool isBlank(char byte) {
-    return kBlanks.find(byte) != std::string_view::npos;
+/// What a byte may be in markup; some are several of these.
+enum ByteUse : unsigned char { kBlank = 1, kNameStart = 2, kNamePart = 4 };
+
+// A table, since every byte of a request's markup is asked about.
+constexpr std::array<unsigned char, 256> makeUses() {
+    std::array<unsigned char, 256> uses{};
+    for (std::size_t byte = 0; byte < uses.size(); ++byte) {
+        const char letter = static_cast<char>(byte);
+        if (byte < 0x80 && kBlanks.find(letter) != std::string_view::npos) uses[byte] |= kBlank;
+        if (utils::isLetter(letter) || letter == '_' || letter == ':' || byte >= 0x80)
+            uses[byte] |= kNameStart | kNamePart;
+        if (utils::isDigit(letter) || letter == '-' || letter == '.') uses[byte] |= kNamePart;
+    }
+    return uses;
 }
 
-bool isNameStart(char byte) {
-    return utils::isLetter(byte) || byte == '_' || byte == ':' || static_cast<unsigned char>(byte) >= 0x80;
+constexpr auto kUses = makeUses();
+
+bool is(char byte, ByteUse use) {
+    return (kUses[static_cast<unsigned char>(byte)] & use) != 0;
 }
 
-bool isNamePart(char byte) {
-    return isNameStart(byte) || utils::isDigit(byte) || byte == '-' || byte == '.';
+/// Where the first byte of another use stands.
+std::size_t endOf(std::string_view text, ByteUse use) {
+    std::size_t end = 0;
+    while (end < text.size() && is(text[end], use))
+        ++end;
+    return end;
 }
 
 struct Attribute {
@@ -84,11 +102,11 @@ class Scanner {
         return taken;
     }
 
-    bool skipBlanks() { return !until(m_rest.find_first_not_of(kBlanks)).empty(); }
+    bool skipBlanks() { return !until(endOf(m_rest, kBlank)).empty(); }
 
     /// The five letters alone do not make a declaration: "<?xml-stylesheet" begins with them, too.
     void declaration() {
-        if (!m_rest.starts_with("<?xml") || m_rest.size() < 6 || !isBlank(m_rest[5])) return;
+        if (!m_rest.starts_with("<?xml") || m_rest.size() < 6 || !is(m_rest[5], kBlank)) return;
         accept("<?xml");
         attributes();
         if (!accept("?>")) refuse("the XML declaration is not ended");
@@ -124,9 +142,8 @@ class Scanner {
     }
 
     std::string_view name() {
-        if (m_rest.empty() || !isNameStart(m_rest[0])) refuse("a name was expected");
-        return until(static_cast<std::size_t>(std::find_if_not(m_rest.begin(), m_rest.end(), isNamePart) -
-                                              m_rest.begin()));
+        if (m_rest.empty() || !is(m_rest[0], kNameStart)) refuse("a name was expected");
+        return until(endOf(m_rest, kNamePart));
     }
 
     void startTag() {
@@ -151,7 +168,7 @@ class Scanner {
 
     void attributes() {
         m_count = 0;
-        while (skipBlanks() && !m_rest.empty() && isNameStart(m_rest[0])) {
+        while (skipBlanks() && !m_rest.empty() && is(m_rest[0], kNameStart)) {
             if (m_count >= std::min(m_limits.attributes, m_attributes.size())) refuse("too many attributes");
             Attribute& attribute = m_attributes[m_count];
             attribute.name = name();

@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+#include <algorithm>
 #include <array>
 
 #include "CimXml/Xml.h"
@@ -56,16 +57,42 @@ std::string_view entityOf(char special) {
     }
 }
 
-/// The length of the run at the front that needs no change.
+constexpr std::size_t kBlock = 16;
+
+/// Whether the block of bytes is of printable ASCII, and with `special` none of them to be escaped. Without a
+/// branch for each byte, so that it takes a few instructions for all of them.
+template <bool special>
+bool isPlainBlock(const char* bytes) {
+    unsigned char other = 0;
+    for (std::size_t i = 0; i < kBlock; ++i) {
+        const auto byte = static_cast<unsigned char>(bytes[i]);
+        other |= static_cast<unsigned char>(byte < 0x20) | static_cast<unsigned char>(byte >= 0x80);
+        if constexpr (special) {
+            other |= static_cast<unsigned char>(byte == '&') | static_cast<unsigned char>(byte == '<') |
+                     static_cast<unsigned char>(byte == '>') | static_cast<unsigned char>(byte == '"');
+        }
+    }
+    return other == 0;
+}
+
+/// The length of the run at the front that needs no change, or with `special` false is allowed at least.
+template <bool special>
 std::size_t plainRun(std::string_view text) {
     std::size_t length = 0;
     while (length < text.size()) {
-        const ByteKind kind = kindOf(text[length]);
-        const std::size_t step = kind == ByteKind::Plain   ? 1
-                                 : kind == ByteKind::Multi ? xmlCharacterLength(text.substr(length))
-                                                           : 0;
-        if (step == 0) break;
-        length += step;
+        while (text.size() - length >= kBlock && isPlainBlock<special>(text.data() + length))
+            length += kBlock;
+        // The rest, or the block that is not plain, byte by byte.
+        const std::size_t end = std::min(length + kBlock, text.size());
+        while (length < end) {
+            const ByteKind kind = kindOf(text[length]);
+            const bool isPlain = kind == ByteKind::Plain || (!special && kind == ByteKind::Special);
+            const std::size_t step = isPlain                   ? 1
+                                     : kind == ByteKind::Multi ? xmlCharacterLength(text.substr(length))
+                                                               : 0;
+            if (step == 0) return length;
+            length += step;
+        }
     }
     return length;
 }
@@ -94,17 +121,12 @@ std::size_t xmlCharacterLength(std::string_view text) {
 }
 
 bool isXmlText(std::string_view text) {
-    while (!text.empty()) {
-        const std::size_t length = kindOf(text[0]) == ByteKind::Special ? 1 : plainRun(text);
-        if (length == 0) return false;
-        text.remove_prefix(length);
-    }
-    return true;
+    return plainRun<false>(text) == text.size();
 }
 
 void appendEscaped(std::string& out, std::string_view text) {
     for (;;) {
-        const std::size_t length = plainRun(text);
+        const std::size_t length = plainRun<true>(text);
         out.append(text.substr(0, length));
         text.remove_prefix(length);
         if (text.empty()) return;

@@ -62,6 +62,17 @@ TEST(XmlTextTest, AnyBytesBecomeTextThatIsAccepted) {
     EXPECT_EQ(escaped("\xC3\xBC\xF0\x9F\x98\x80"), "\xC3\xBC\xF0\x9F\x98\x80");
     EXPECT_EQ(escaped("a\xC3"), "a\xEF\xBF\xBD");
     EXPECT_EQ(escaped("\xED\xA0\x80"), "\xEF\xBF\xBD\xEF\xBF\xBD\xEF\xBF\xBD");
+    // Plain text is passed over in blocks, wherever in them another byte stands.
+    for (std::size_t at = 0; at < 40; ++at) {
+        const std::string before(at, 'x');
+        const std::string behind(40 - at, 'y');
+        EXPECT_EQ(escaped(before + '<' + behind), before + "&lt;" + behind);
+        EXPECT_EQ(escaped(before + '\x1F' + behind), before + behind);
+        EXPECT_EQ(escaped(before + "\xE2\x82\xAC" + behind), before + "\xE2\x82\xAC" + behind);
+        EXPECT_NO_THROW(checkWellFormed("<a>" + before + "&lt;\xC3\xBC" + behind + "</a>"));
+        for (const char* bad : {"\x1F", "\x80", "\xEF\xBF\xBF"})
+            EXPECT_THROW(checkWellFormed("<a>" + before + bad + behind + "</a>"), WireError) << at;
+    }
     std::mt19937 random(1);
     for (int round = 0; round < 2000; ++round) {
         std::string bytes(random() % 40, ' ');
