@@ -114,9 +114,13 @@ void writeValue(XmlWriter& writer, const core::CimValue& value);
 /// VALUE with a text.
 void writeText(XmlWriter& writer, std::string_view text);
 
-/// VALUE of a cell, and KEYVALUE.
+/// VALUE of a cell, KEYVALUE, and what is inside of both.
 void writeCell(XmlWriter& writer, const core::CimCell& cell);
 void writeKeyValue(XmlWriter& writer, const core::CimCell& cell);
+void writeCellText(XmlWriter& writer, const core::CimCell& cell);
+
+/// The start of KEYVALUE for a value of the type.
+void startKeyValue(XmlWriter& writer, core::CimType type);
 
 /// PARAMVALUE, with its type unless the argument has none of its own.
 void writeArgument(XmlWriter& writer, const core::Argument& argument);

@@ -4,100 +4,80 @@
 #include <utility>
 
 #include "CimXml/ElementCodec.h"
+#include "CimXml/ShapeMarkup.h"
 #include "Framework/Model/CimInstance.h"
 #include "Framework/Model/CimProperty.h"
 
 namespace cimxml {
 
-namespace {
-
-/// As writeValue() writes a value that is not null.
-void writeCells(XmlWriter& writer, const core::CimProperty& property) {
-    if (property.isArray()) writer.raw("<VALUE.ARRAY>");
+// Every property of a long answer comes here, and an append costs more than what it appends.
+void InstanceStream::writeProperty(const core::CimProperty& property, const ShapeMarkup& markup,
+                                   std::size_t index) {
+    if (property.isNull()) {
+        m_writer.raw(markup.nullHead(index)).raw(property.isArray() ? "</PROPERTY.ARRAY>" : "</PROPERTY>");
+        return;
+    }
+    m_writer.raw(markup.head(index));
+    if (!property.isArray()) {
+        writeCellText(m_writer, property.cell(0));
+        m_writer.raw("</VALUE></PROPERTY>");
+        return;
+    }
     for (std::size_t i = 0; i < property.cellCount(); ++i)
-        writeCell(writer, property.cell(i));
-    if (property.isArray()) writer.raw("</VALUE.ARRAY>");
+        writeCell(m_writer, property.cell(i));
+    m_writer.raw("</VALUE.ARRAY></PROPERTY.ARRAY>");
 }
 
-void startElement(XmlWriter& writer, core::CimProperty& property) {
-    startProperty(writer, property.getName(), property.getType(), property.isArray());
-    writer.content();
-}
-
-std::string_view elementOf(core::CimProperty& property) {
-    return propertyElement(property.getType(), property.isArray());
-}
-
-/// INSTANCENAME, which has to name every key: one that is null by an empty text.
-void writePath(XmlWriter& writer, const core::CimInstance& instance, const std::string& className) {
-    writer.start("INSTANCENAME").attribute("CLASSNAME", className).content();
-    for (const core::CimProperty* key : instance.getKeys()) {
-        writer.start("KEYBINDING").attribute("NAME", key->getName()).content();
-        const bool isEmpty = key->isNull() || key->isArray();
-        writeKeyValue(writer, isEmpty ? core::CimCell(std::string_view()) : key->cell(0));
-        writer.end("KEYBINDING");
-    }
-    writer.end("INSTANCENAME");
-}
-
-/// One alone of its shape.
-void writeFirst(XmlWriter& writer, const core::InstanceCells& cells) {
-    for (const std::size_t index : cells.wanted) {
-        core::CimProperty& property = *cells.instance.getAllProperties()[index];
-        startElement(writer, property);
-        if (!property.isNull()) writeCells(writer, property);
-        writer.end(elementOf(property));
-    }
-}
-
-}  // namespace
-
-InstanceStream::ShapeMarkup InstanceStream::markupOf(const core::InstanceCells& cells) {
-    ShapeMarkup markup;
-    for (const std::size_t index : cells.wanted) {
-        core::CimProperty& property = *cells.instance.getAllProperties()[index];
-        Markup& made = markup.emplace_back();
-        XmlWriter head(made.head);
-        startElement(head, property);
-        XmlWriter(made.tail).end(elementOf(property));
-        made.null = made.head + made.tail;
-    }
-    return markup;
-}
-
-void InstanceStream::writeInstance(const core::InstanceCells& cells, const ShapeMarkup& markup) {
-    for (std::size_t i = 0; i < markup.size(); ++i) {
-        const core::CimProperty& property = *cells.instance.getAllProperties()[cells.wanted[i]];
-        if (property.isNull()) {
-            m_writer.raw(markup[i].null);
-            continue;
+/// INSTANCENAME, which has to name every key: one that is null by an empty text. Like markupOf(), it is
+/// called under the instance's lock.
+void InstanceStream::writePath(const core::CimInstance& instance, const std::string& className,
+                               const ShapeMarkup& markup) QUENX_NO_THREAD_SAFETY_ANALYSIS {
+    m_writer.start("INSTANCENAME").attribute("CLASSNAME", className).content();
+    for (const std::size_t index : instance.keyIndices()) {
+        core::CimProperty& key = *instance.getAllProperties()[index];
+        if (key.isNull() || key.isArray()) {
+            m_writer.start("KEYBINDING").attribute("NAME", key.getName()).content();
+            writeKeyValue(m_writer, core::CimCell(std::string_view()));
+            m_writer.raw("</KEYBINDING>");
+        } else {
+            m_writer.raw(markup.keyHead(index));
+            writeCellText(m_writer, key.cell(0));
+            m_writer.raw("</KEYVALUE></KEYBINDING>");
         }
-        m_writer.raw(markup[i].head);
-        writeCells(m_writer, property);
-        m_writer.raw(markup[i].tail);
     }
+    m_writer.raw("</INSTANCENAME>");
+}
+
+const ShapeMarkup& InstanceStream::markupOf(const core::CimInstance& instance)
+    QUENX_NO_THREAD_SAFETY_ANALYSIS {
+    const void* shape = &instance.shape();
+    if (shape != m_shape) m_markup = &ShapeMarkup::of(shape, instance.getAllProperties());
+    m_shape = shape;
+    return *m_markup;
 }
 
 std::size_t InstanceStream::take(const core::InstanceCells& cells) {
     begin();
+    const ShapeMarkup& markup = markupOf(cells.instance);
     const std::string className = cells.instance.getCreationClassName();
-    m_writer.open("VALUE.NAMEDINSTANCE");
-    writePath(m_writer, cells.instance, className);
-    m_writer.start("INSTANCE").attribute("CLASSNAME", className).content();
-    const auto [entry, isFirst] = m_shapes.try_emplace(&cells.wanted);
-    if (isFirst) {
-        writeFirst(m_writer, cells);
-    } else {
-        if (entry->second.empty()) entry->second = markupOf(cells);
-        writeInstance(cells, entry->second);
+    if (m_hasPaths) {
+        m_writer.raw("<VALUE.NAMEDINSTANCE>");
+        writePath(cells.instance, className, markup);
     }
-    m_writer.end("INSTANCE").end("VALUE.NAMEDINSTANCE");
+    m_writer.start("INSTANCE").attribute("CLASSNAME", className).content();
+    for (const std::size_t index : cells.wanted)
+        writeProperty(*cells.instance.getAllProperties()[index], markup, index);
+    m_writer.raw(m_hasPaths ? "</INSTANCE></VALUE.NAMEDINSTANCE>" : "</INSTANCE>");
     return grown();
 }
 
 std::size_t InstanceStream::take(const core::InstanceValue& instance) {
     begin();
-    writeNamedInstance(m_writer, instance);
+    if (m_hasPaths) {
+        writeNamedInstance(m_writer, instance);
+    } else {
+        writeInstance(m_writer, instance);
+    }
     return grown();
 }
 

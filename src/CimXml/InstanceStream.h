@@ -1,22 +1,29 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
-#include <map>
 #include <string>
-#include <vector>
 
 #include "CimXml/Response.h"
 #include "CimXml/Xml.h"
 
+namespace core {
+class CimProperty;
+}
+
 namespace cimxml {
 
-/// The response message of an enumeration, written while it goes on: no instance of it is kept as a value.
-/// Byte for byte what writeResponse() makes of the same instances. Used on one thread.
+class ShapeMarkup;
+
+/// The response message of an enumeration or of GetInstance, written while it goes on: no instance of it is
+/// kept as a value. Byte for byte what writeResponse() makes of the same instances. Used on one thread.
 class InstanceStream : public core::InstanceSink {
   public:
     /// Both as in the request, which has to outlive the stream.
     InstanceStream(const std::string& messageId, const std::string& operation)
         : m_messageId(messageId), m_operation(operation) {}
+
+    /// Before the first instance: Instance, or NamedInstances, which they are if nobody says so.
+    void setKind(ResultKind kind) { m_hasPaths = kind == ResultKind::NamedInstances; }
 
     std::size_t take(const core::InstanceCells& instance) override;
     std::size_t take(const core::InstanceValue& instance) override;
@@ -25,28 +32,23 @@ class InstanceStream : public core::InstanceSink {
     std::string finish();
 
   private:
-    /// What is around the value of a property.
-    struct Markup {
-        std::string head;
-        std::string tail;
-        std::string null;  ///< the whole element without a value
-    };
-    /// Of the wanted properties of one shape.
-    using ShapeMarkup = std::vector<Markup>;
-
-    static ShapeMarkup markupOf(const core::InstanceCells& instance);
-    void writeInstance(const core::InstanceCells& instance, const ShapeMarkup& markup);
+    const ShapeMarkup& markupOf(const core::CimInstance& instance);
+    void writePath(const core::CimInstance& instance, const std::string& className,
+                   const ShapeMarkup& markup);
+    void writeProperty(const core::CimProperty& property, const ShapeMarkup& markup, std::size_t index);
     std::size_t grown();
     void begin();
     void makeRoom();
 
     const std::string& m_messageId;
     const std::string& m_operation;
+    bool m_hasPaths = true;
     std::string m_text;
     XmlWriter m_writer{m_text};
     std::size_t m_told = 0;  ///< of what the text takes
-    /// Made when a second instance of a shape comes: most of a long answer is markup.
-    std::map<const void*, ShapeMarkup> m_shapes;
+    // Of the last instance: most answers hold those of one shape.
+    const void* m_shape = nullptr;
+    const ShapeMarkup* m_markup = nullptr;
 };
 
 }  // namespace cimxml

@@ -16,17 +16,6 @@ constexpr std::array kHeldTypes{CimType::Boolean, CimType::Uint64,   CimType::Si
 static_assert(kHeldTypes.size() == std::variant_size_v<core::CimScalar>);
 static_assert(kHeldTypes.size() - 1 == std::variant_size_v<core::CimCell>);
 
-void writeContent(XmlWriter& writer, const core::CimCell& cell) {
-    core::CellBuffer buffer;
-    const std::string_view text = core::cellText(cell, buffer);
-    // Only texts can hold what has to be escaped.
-    if (std::holds_alternative<std::string_view>(cell)) {
-        writer.text(text);
-    } else {
-        writer.raw(text);
-    }
-}
-
 /// VALUE.REFERENCE.
 void writeReference(XmlWriter& writer, const core::CimPath& path) {
     writer.open("VALUE.REFERENCE");
@@ -56,22 +45,37 @@ CimType typeOfScalar(const core::CimScalar& value) {
     return kHeldTypes[value.index()];
 }
 
+void writeCellText(XmlWriter& writer, const core::CimCell& cell) {
+    core::CellBuffer buffer;
+    const std::string_view text = core::cellText(cell, buffer);
+    // Only texts can hold what has to be escaped.
+    if (std::holds_alternative<std::string_view>(cell)) {
+        writer.text(text);
+    } else {
+        writer.raw(text);
+    }
+}
+
 void writeCell(XmlWriter& writer, const core::CimCell& cell) {
     writer.raw("<VALUE>");
-    writeContent(writer, cell);
+    writeCellText(writer, cell);
     writer.raw("</VALUE>");
 }
 
 // Old clients know VALUETYPE alone, and TYPE tells apart what it throws together. A number is held without
 // its width, and a wrong TYPE would be worse than none.
-void writeKeyValue(XmlWriter& writer, const core::CimCell& cell) {
-    const CimType type = kHeldTypes[cell.index()];
+void startKeyValue(XmlWriter& writer, CimType type) {
     const bool isNumber = core::isUnsigned(type) || core::isSigned(type) || core::isReal(type);
+    const bool isText = !isNumber && type != CimType::Boolean && type != CimType::Datetime;
     writer.start("KEYVALUE");
     writer.attribute("VALUETYPE", type == CimType::Boolean ? "boolean" : isNumber ? "numeric" : "string");
-    if (!isNumber) writer.attribute("TYPE", core::typeName(type));
+    if (!isNumber) writer.attribute("TYPE", core::typeName(isText ? CimType::String : type));
     writer.content();
-    writeContent(writer, cell);
+}
+
+void writeKeyValue(XmlWriter& writer, const core::CimCell& cell) {
+    startKeyValue(writer, kHeldTypes[cell.index()]);
+    writeCellText(writer, cell);
     writer.end("KEYVALUE");
 }
 

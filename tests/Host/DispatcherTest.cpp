@@ -59,18 +59,25 @@ TEST_F(DispatcherTest, StreamsWhatItAnswers) {
     m_agent.add("x")->ID.setNull();
     m_agent.add("a", 1)->Codes = {5, 6};  // the same again
     const ClassName gadgets{"Test_Gadget"};
-    const Given table[] = {
-        {{"ClassName", gadgets}},
-        {{"ClassName", ClassName{"Test_Thing"}}, {"DeepInheritance", "FALSE"}},
-        {{"ClassName", gadgets}, {"PropertyList", std::vector<std::string>{"MADE", "none", "codes"}}},
-        {{"ClassName", gadgets}, {"PropertyList", std::vector<std::string>()}},
-        {{"ClassName", gadgets}, {"IncludeClassOrigin", "TRUE"}},
-        {{"ClassName", ClassName{"Test_Link"}}},
-        {{"ClassName", ClassName{"Unknown"}}},
+    const std::vector<std::string> few{"MADE", "none", "codes"};
+    const char* const enumerate = "enumerateinstances";
+    const char* const get = "getInstance";
+    const std::pair<const char*, Given> table[] = {
+        {enumerate, {{"ClassName", gadgets}}},
+        {enumerate, {{"ClassName", ClassName{"Test_Thing"}}, {"DeepInheritance", "FALSE"}}},
+        {enumerate, {{"ClassName", gadgets}, {"PropertyList", few}}},
+        {enumerate, {{"ClassName", gadgets}, {"PropertyList", std::vector<std::string>()}}},
+        {enumerate, {{"ClassName", gadgets}, {"IncludeClassOrigin", "TRUE"}}},
+        {enumerate, {{"ClassName", ClassName{"Test_Link"}}}},
+        {enumerate, {{"ClassName", ClassName{"Unknown"}}}},
+        {get, {{"InstanceName", gadget("b", "2")}}},
+        {get, {{"InstanceName", gadget("b", "2")}, {"PropertyList", few}}},
+        {get, {{"InstanceName", gadget("b", "2")}, {"IncludeClassOrigin", "TRUE"}}},
+        {get, {{"InstanceName", gadget("b", "3")}}},
+        {get, {{"InstanceName", link()}}},
     };
-    for (const Given& parameters : table) {
-        const cimxml::Request request{"<1>",
-                                      cimxml::IntrinsicCall{"enumerateinstances", m_namespace, parameters}};
+    for (const auto& [operation, parameters] : table) {
+        const cimxml::Request request{"<1>", cimxml::IntrinsicCall{operation, m_namespace, parameters}};
         host::AnswerCharge charge = m_dispatcher.charge(m_caller.user);
         EXPECT_EQ(m_dispatcher.answer(request, m_caller, charge),
                   cimxml::writeResponse(m_dispatcher.dispatch(request, m_caller, charge)));
@@ -78,7 +85,7 @@ TEST_F(DispatcherTest, StreamsWhatItAnswers) {
     for (unsigned int i = 0; i < 2000; ++i)
         m_agent.add("more", i);
     host::AnswerCharge charge = m_dispatcher.charge(m_caller.user);
-    const cimxml::Request all{"1", cimxml::IntrinsicCall{"EnumerateInstances", m_namespace, table[0]}};
+    const cimxml::Request all{"1", cimxml::IntrinsicCall{"EnumerateInstances", m_namespace, table[0].second}};
     const std::string text = m_dispatcher.answer(all, m_caller, charge);
     EXPECT_NE(text.find("<ERROR CODE=\"27\""), std::string::npos) << text.size();
 }
@@ -291,7 +298,8 @@ TEST_F(DispatcherTest, LeavesOneAuditLineForEachChangeAndRefusal) {
                                  R"(outcome="returned 12, Job=root/cimv2:Test_Gadget.ID=\"a\",Number=1")");
     EXPECT_EQ(lines[1].text, who + R"("deleteinstance")" + target + R"(arguments="" outcome="done")");
     EXPECT_EQ(lines[2].text, "[audit] user=\"" + name + R"(" address="192.0.2.1" operation="Work")" + target +
-                                 R"(arguments="" outcome="denied: user )" + name + R"( may only read" reason="QX-0502")");
+                                 R"(arguments="" outcome="denied: user )" + name +
+                                 R"( may only read" reason="QX-0502")");
     EXPECT_LT(lines[3].text.size(), 1400U);
     EXPECT_NE(lines[3].text.find(std::string(64, 'u') + R"(\..." address="192.0.2.1")"), std::string::npos);
     const std::string cut = "=\"denied: user " + std::string(256 - 13, 'u') + R"(\..." reason="QX-0502")";

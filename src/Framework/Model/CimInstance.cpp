@@ -145,6 +145,10 @@ const CimInstance::Shape& CimInstance::shape() const {
     return *m_shape;
 }
 
+const std::vector<std::size_t>& CimInstance::keyIndices() const {
+    return shape().keys;
+}
+
 std::vector<CimProperty*> CimInstance::select(const std::vector<std::size_t>& indices) const {
     std::vector<CimProperty*> selected;
     selected.reserve(indices.size());
@@ -228,7 +232,7 @@ std::size_t hashOfKey(const CimProperty& key) {
 
 std::size_t CimInstance::hashOfKeys() const {
     const RecursiveLocker lock(m_mutex);
-    const std::vector<std::size_t>& keys = shape().keys;
+    const std::vector<std::size_t>& keys = keyIndices();
     return std::accumulate(
         keys.begin(), keys.end(), std::size_t{0},
         [this](std::size_t sum, std::size_t key) { return sum + hashOfKey(*m_properties[key]); });

@@ -103,8 +103,10 @@ class QUENX_EXPORT CimInstance {
     std::vector<CimProperty*> getKeys() const;
     /// Every registered property, repeated names included, in the order of construction.
     const std::vector<CimProperty*>& getAllProperties() const { return m_properties; }
-    /// To be called under the lock below.
+    // To be called under the lock below.
     const Shape& shape() const QUENX_REQUIRES(m_mutex);
+    /// Where the keys that are served stand among all properties.
+    const std::vector<std::size_t>& keyIndices() const QUENX_REQUIRES(m_mutex);
     /// CimPath::of() this instance, found once and shared until a key changes.
     std::shared_ptr<const CimPath> getPath() const;
 

@@ -141,6 +141,10 @@ void CimOperations::streamInstances(const std::string& className, const Property
         AnswerMeter::tell(sink.take(instance));
 }
 
+void CimOperations::streamInstance(const CimPath& path, const PropertyFilter& filter, InstanceSink& sink) {
+    AnswerMeter::tell(sink.take(getInstance(path, filter)));
+}
+
 // Most cannot. A client that is wrong about the class or the instance, too, hears that first.
 
 CimPath CimOperations::createInstance(const InstanceValue& instance) {

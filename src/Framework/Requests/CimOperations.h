@@ -146,6 +146,8 @@ class QUENX_EXPORT CimOperations {
     /// InvalidClass for an unknown class, InvalidParameter for keys that are not those of the class, NotFound
     /// when no instance has them.
     virtual InstanceValue getInstance(const CimPath& path, const PropertyFilter& filter = std::nullopt) = 0;
+    /// The same, without a copy of the instance where the implementation can do without.
+    virtual void streamInstance(const CimPath& path, const PropertyFilter& filter, InstanceSink& sink);
 
     /// Instances at the other ends of associations that refer to the path. An end whose instance cannot be
     /// found any more is left out. Errors as getInstance(), but a path that names no instance has no

@@ -187,6 +187,14 @@ InstanceValue CimRequests::getInstance(const CimPath& path, const PropertyFilter
     });
 }
 
+void CimRequests::streamInstance(const CimPath& path, const PropertyFilter& filter, InstanceSink& sink) {
+    answerRequest(m_namespace, [&](const ServedClasses& classes) {
+        CimPath typed = classes.typed(path);
+        WantedProperties wanted(filter);
+        AnswerMeter::tell(handOver(classes.requireInstance(typed), wanted, m_namespace, sink));
+    });
+}
+
 void CimRequests::deleteInstance(const CimPath& path) {
     answerRequest(m_namespace, [&](const ServedClasses& classes) {
         const PolicyDecision decision;

@@ -22,6 +22,7 @@ class QUENX_EXPORT CimRequests : public CimOperations {
                          InstanceSink& sink) override;
     std::vector<CimPath> enumerateInstanceNames(const std::string& className) override;
     InstanceValue getInstance(const CimPath& path, const PropertyFilter& filter = std::nullopt) override;
+    void streamInstance(const CimPath& path, const PropertyFilter& filter, InstanceSink& sink) override;
 
     std::vector<InstanceValue> associators(const CimPath& path, const AssociationFilter& by,
                                            const PropertyFilter& filter = std::nullopt) override;

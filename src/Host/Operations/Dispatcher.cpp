@@ -77,7 +77,7 @@ core::CimOperations& Dispatcher::findNamespace(const std::string& name) const {
 }
 
 IntrinsicResult Dispatcher::callOperation(const cimxml::IntrinsicCall& call, const Caller& caller,
-                                          AnswerCharge& charge, core::InstanceSink* stream) {
+                                          AnswerCharge& charge, cimxml::InstanceStream* stream) {
     const Operation* operation = findOperation(call.operation);
     if (operation != nullptr) requirePrivilege(operation->privilege, caller);
     // The namespace before the operation: clients probe for namespaces with whatever operation they like.
@@ -126,7 +126,7 @@ void Dispatcher::audit(const cimxml::Request& request, const Caller& caller, con
 }
 
 cimxml::Response Dispatcher::dispatch(const cimxml::Request& request, const Caller& caller,
-                                      AnswerCharge& charge, core::InstanceSink* stream) {
+                                      AnswerCharge& charge, cimxml::InstanceStream* stream) {
     const core::NotedCall noted;
     cimxml::Response response = carryOut(request, caller, charge, stream);
     // However it ended: that somebody was refused is worth knowing, too.
@@ -144,7 +144,7 @@ std::string Dispatcher::answer(const cimxml::Request& request, const Caller& cal
 }
 
 cimxml::Response Dispatcher::carryOut(const cimxml::Request& request, const Caller& caller,
-                                      AnswerCharge& charge, core::InstanceSink* stream) {
+                                      AnswerCharge& charge, cimxml::InstanceStream* stream) {
     cimxml::Response response;
     response.messageId = request.messageId;
     response.name = request.name();

@@ -31,7 +31,7 @@ class Dispatcher {
     /// @param charge  of the answer
     /// @param stream  takes the instances of an enumeration; see OperationContext
     cimxml::Response dispatch(const cimxml::Request& request, const Caller& caller, AnswerCharge& charge,
-                              core::InstanceSink* stream = nullptr);
+                              cimxml::InstanceStream* stream = nullptr);
 
     /// The same as a message. Throws OverBudget.
     std::string answer(const cimxml::Request& request, const Caller& caller, AnswerCharge& charge);
@@ -41,9 +41,9 @@ class Dispatcher {
 
   private:
     cimxml::Response carryOut(const cimxml::Request& request, const Caller& caller, AnswerCharge& charge,
-                              core::InstanceSink* stream);
+                              cimxml::InstanceStream* stream);
     cimxml::IntrinsicResult callOperation(const cimxml::IntrinsicCall& call, const Caller& caller,
-                                          AnswerCharge& charge, core::InstanceSink* stream);
+                                          AnswerCharge& charge, cimxml::InstanceStream* stream);
     core::MethodResult callMethod(const cimxml::MethodCall& call, const Caller& caller);
     core::CimOperations& findNamespace(const std::string& name) const;
     void audit(const cimxml::Request& request, const Caller& caller, const cimxml::Response& response,

@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+#include "CimXml/InstanceStream.h"
 #include "Host/Operations/Operations.h"
 #include "Indications/Subscriptions/Subscriptions.h"
 
@@ -79,9 +80,15 @@ core::AssociationFilter filterOf(const Parameters& parameters) {
 }  // namespace
 
 IntrinsicResult getInstance(const OperationContext& context, const Parameters& parameters) {
-    return instancesResult(
-        context, parameters, ResultKind::Instance,
-        {context.target.getInstance(parameters.path("InstanceName"), parameters.list("PropertyList"))});
+    const core::CimPath path = parameters.path("InstanceName");
+    const core::PropertyFilter filter = parameters.list("PropertyList");
+    if (context.stream != nullptr && !parameters.flag("IncludeClassOrigin", false)) {
+        context.stream->setKind(ResultKind::Instance);
+        context.target.streamInstance(path, filter, *context.stream);
+        return {.kind = ResultKind::Instance, .isStreamed = true};
+    }
+    return instancesResult(context, parameters, ResultKind::Instance,
+                           {context.target.getInstance(path, filter)});
 }
 
 IntrinsicResult enumerateInstances(const OperationContext& context, const Parameters& parameters) {

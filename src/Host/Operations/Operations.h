@@ -11,6 +11,10 @@
 #include "Host/Operations/OpenEnumerations.h"
 #include "Host/Operations/Parameters.h"
 
+namespace cimxml {
+class InstanceStream;
+}
+
 namespace host {
 
 /// What a user must be allowed in order to call an operation.
@@ -30,9 +34,9 @@ struct OperationContext {
     const Caller& caller;
     OpenEnumerations& enumerations;
     AnswerCharge& charge;  ///< of the answer
-    /// Takes the instances of an enumeration instead of the result, which then says so; null when they are
-    /// wanted as values.
-    core::InstanceSink* stream = nullptr;
+    /// Takes the instances of an enumeration, or the one asked for, instead of the result, which then says
+    /// so; null when they are wanted as values.
+    cimxml::InstanceStream* stream = nullptr;
 };
 
 /// An intrinsic operation. Handlers throw CimError.
