@@ -6,7 +6,7 @@
 
 #include <algorithm>
 #include <array>
-#include <set>
+#include <bitset>
 
 #include "CimXml/Response.h"
 #include "Framework/Requests/Audit.h"
@@ -26,43 +26,66 @@ namespace {
 
 constexpr const char* kRealm = "Basic realm=\"Quenx management\", charset=\"UTF-8\"";
 
-/// What only shows when all headers are looked at.
+using Text = std::optional<std::string>;
+
+template <Text HttpHead::*place>
+void keep(HttpHead& head, const char* value) {
+    head.*place = value;
+}
+template <Text cimxml::RequestHeaders::*place>
+void keep(HttpHead& head, const char* value) {
+    head.cim.*place = value;
+}
+
+/// A header that is used.
+struct KnownHeader {
+    std::string_view name;
+    /// Those decide for whom, by whom and what is asked; others may come in several parts, and the first
+    /// counts.
+    bool isSingle;
+    void (*keep)(HttpHead& head, const char* value);
+};
+
+constexpr std::array kKnownHeaders{
+    KnownHeader{"Host", true, [](HttpHead& head, const char* value) { head.host = value; }},
+    KnownHeader{"Authorization", true, keep<&HttpHead::authorization>},
+    KnownHeader{"Content-Type", true, keep<&HttpHead::contentType>},
+    KnownHeader{"Content-Encoding", true, keep<&HttpHead::contentEncoding>},
+    KnownHeader{"CIMOperation", true, keep<&cimxml::RequestHeaders::operation>},
+    KnownHeader{"CIMMethod", true, keep<&cimxml::RequestHeaders::method>},
+    KnownHeader{"CIMObject", true, keep<&cimxml::RequestHeaders::object>},
+    KnownHeader{control::kSumHeader, true, keep<&HttpHead::sum>},
+    KnownHeader{"CIMProtocolVersion", false, keep<&cimxml::RequestHeaders::protocolVersion>},
+    KnownHeader{"CIMBatch", false, [](HttpHead& head, const char*) { head.cim.batch = true; }},
+    KnownHeader{"Transfer-Encoding", false, [](HttpHead& head, const char*) { head.isChunked = true; }}};
+
+/// Which of them have been seen.
 struct HeaderSurvey {
     HttpHead& head;
-    std::set<std::string> names;
+    std::bitset<kKnownHeaders.size()> seen;
 };
 
 MHD_Result lookAtHeader(void* to, MHD_ValueKind, const char* text, const char* value) {
-    // Those that decide for whom, by whom and what is asked; others may come in several parts.
-    constexpr std::array kSingle = {"host",         "authorization", "content-type", "content-encoding",
-                                    "cimoperation", "cimmethod",     "cimobject",    "quenx-sha256"};
-    auto& survey = *static_cast<HeaderSurvey*>(to);
-    const std::string name = utils::lowerCase(text);
+    auto& [head, seen] = *static_cast<HeaderSurvey*>(to);
+    const std::string_view name = text;
     // "Content-Length : 5" is a length to some readers and to others none (RFC 9112 5.1).
-    if (name.find_first_of(" \t") != std::string::npos) survey.head.isAmbiguous = true;
-    if (name == "content-length") survey.head.contentLengths.emplace_back(value == nullptr ? "" : value);
-    if (std::find(kSingle.begin(), kSingle.end(), name) != kSingle.end() && !survey.names.insert(name).second)
-        survey.head.isAmbiguous = true;
+    if (name.find_first_of(" \t") != std::string_view::npos) head.isAmbiguous = true;
+    if (core::sameName(name, "Content-Length"))
+        head.contentLengths.emplace_back(value == nullptr ? "" : value);
+    for (std::size_t i = 0; i < kKnownHeaders.size(); ++i) {
+        if (!core::sameName(name, kKnownHeaders[i].name)) continue;
+        if (!seen[i] && value != nullptr) kKnownHeaders[i].keep(head, value);
+        if (seen[i] && kKnownHeaders[i].isSingle) head.isAmbiguous = true;
+        seen.set(i);
+    }
     return MHD_YES;
 }
 
 HttpHead readHead(MHD_Connection* connection, const char* method, const char* path) {
-    const auto header = [&](const char* name) -> std::optional<std::string> {
-        const char* value = ::MHD_lookup_connection_value(connection, MHD_HEADER_KIND, name);
-        return value == nullptr ? std::nullopt : std::optional<std::string>(value);
-    };
     HttpHead head;
     head.method = method;
     head.path = path;
     head.address = addressOf(connection);
-    head.host = header("Host").value_or("");
-    head.authorization = header("Authorization");
-    head.contentType = header("Content-Type");
-    head.contentEncoding = header("Content-Encoding");
-    head.isChunked = header("Transfer-Encoding").has_value();
-    head.sum = header(control::kSumHeader);
-    head.cim = {header("CIMOperation"), header("CIMMethod"), header("CIMObject"),
-                header("CIMProtocolVersion"), header("CIMBatch").has_value()};
     HeaderSurvey survey{head, {}};
     ::MHD_get_connection_values(connection, MHD_HEADER_KIND, &lookAtHeader, &survey);
     return head;
