@@ -49,8 +49,10 @@ CredentialCache::Digest CredentialCache::digestOf(const Credentials& credentials
 
 std::optional<CredentialCache::Known> CredentialCache::find(const Credentials& credentials,
                                                             const std::string& place) {
+    // Before the lock: each request of each connection comes here.
+    const Digest digest = digestOf(credentials, place);
     const utils::Mutex::AutoLocker lock(m_mutex);
-    const auto found = m_entries.find(digestOf(credentials, place));
+    const auto found = m_entries.find(digest);
     if (found == m_entries.end()) return std::nullopt;
     return Known{found->second.user, found->second.expires > Clock::now()};
 }
