@@ -4,6 +4,7 @@
 #include <execinfo.h>
 #include <syslog.h>
 
+#include <algorithm>
 #include <array>
 #include <cerrno>
 #include <charconv>
@@ -186,16 +187,19 @@ void writeAuditLog(const std::string& line) noexcept {
 
 std::string escapeForLog(std::string_view text, std::size_t limit) {
     std::string escaped;
+    escaped.reserve(std::min(text.size(), limit));
     for (const char c : text) {
-        std::string piece(1, c);
         // Whatever is not ASCII too: a look-alike of another name, or an override that turns the line around.
-        if (isControl(c) || static_cast<unsigned char>(c) >= 0x80) {
-            piece = "\\x" + hexByte(static_cast<unsigned char>(c));
-        } else if (c == '"' || c == '\'' || c == '\\') {
-            piece.insert(0, 1, '\\');
+        const bool isHidden = isControl(c) || static_cast<unsigned char>(c) >= 0x80;
+        const bool isMark = c == '"' || c == '\'' || c == '\\';
+        const std::size_t length = isHidden ? 4 : isMark ? 2 : 1;
+        if (escaped.size() + length > limit) return escaped.append("\\...");
+        if (isHidden) {
+            escaped.append("\\x").append(hexByte(static_cast<unsigned char>(c)));
+        } else {
+            if (isMark) escaped += '\\';
+            escaped += c;
         }
-        if (escaped.size() + piece.size() > limit) return escaped + "\\...";
-        escaped += piece;
     }
     return escaped;
 }

@@ -97,12 +97,15 @@ std::string hexByte(unsigned char byte) {
 }
 
 std::string quoted(std::string_view text) {
-    std::string result = "\"";
+    std::string result;
+    result.reserve(text.size() + 2);
+    result += '"';
     for (const char c : text) {
         if (c == '"' || c == '\\') result += '\\';
         result += c;
     }
-    return result + '"';
+    result += '"';
+    return result;
 }
 
 void replaceCharacter(std::string& text, char from, char to) {

@@ -130,13 +130,13 @@ bool CimPath::parse(std::string_view text) {
 std::string CimPath::toString() const {
     if (!isValid()) return m_unparsed;
     std::string text;
-    if (!m_host.empty()) text += "//" + m_host + "/";
-    if (!m_namespace.empty()) text += m_namespace + ":";
+    if (!m_host.empty()) text.append("//").append(m_host).append("/");
+    if (!m_namespace.empty()) text.append(m_namespace).append(":");
     text += m_className;
     char separator = '.';
     for (const CimKey& key : m_keys) {
         text += separator;
-        text += key.name + "=" + keyText(key.value);
+        text.append(key.name).append("=").append(keyText(key.value));
         separator = ',';
     }
     return text;
