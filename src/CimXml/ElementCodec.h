@@ -131,6 +131,9 @@ std::string_view propertyElement(core::CimType type, bool isArray);
 /// The start of that element, with its name and type.
 void startProperty(XmlWriter& writer, std::string_view name, core::CimType type, bool isArray);
 
+/// INSTANCE, as a client reads it: the class in its path alone. Refuses two properties of one name.
+core::InstanceValue readInstance(const pugi::xml_node& element);
+
 /// INSTANCE. Null properties are written as elements without a value.
 void writeInstance(XmlWriter& writer, const core::InstanceValue& instance);
 

@@ -41,6 +41,33 @@ std::string writeExport(const ExportedIndication& indication, std::string_view m
     return out;
 }
 
+ReceivedIndication readExport(std::string_view bytes) {
+    pugi::xml_document document;
+    const Envelope envelope = openEnvelope(document, bytes, "SIMPLEEXPREQ");
+    expectElement(envelope.content, "EXPMETHODCALL");
+    const pugi::xml_node parameter = onlyChild(envelope.content);
+    expectElement(parameter, "EXPPARAMVALUE");
+    ReceivedIndication received{envelope.messageId, readInstance(onlyChild(parameter)), {}};
+    const std::string source = received.indication.text("SourceInstance");
+    if (source.empty()) return received;
+    pugi::xml_document embedded;
+    if (!embedded.load_buffer(source.data(), source.size(),
+                              pugi::parse_default | pugi::parse_ws_pcdata_single))
+        refuseElement(parameter, "embeds an instance that cannot be read");
+    received.source = readInstance(embedded.document_element());
+    return received;
+}
+
+std::string writeExportAnswer(std::string_view messageId) {
+    std::string out;
+    XmlWriter writer(out);
+    startEnvelope(writer, messageId, "SIMPLEEXPRSP");
+    writer.start("EXPMETHODRESPONSE").attribute("NAME", "ExportIndication").content();
+    writer.end("EXPMETHODRESPONSE");
+    endEnvelope(writer, "SIMPLEEXPRSP");
+    return out;
+}
+
 std::optional<ErrorResult> readExportAnswer(std::string_view bytes) {
     pugi::xml_document document;
     const Envelope envelope = openEnvelope(document, bytes, "SIMPLEEXPRSP");

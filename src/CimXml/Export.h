@@ -33,4 +33,18 @@ std::string writeExport(const ExportedIndication& indication, std::string_view m
 /// bytes that are no such answer. Thread-safe, no state.
 std::optional<ErrorResult> readExportAnswer(std::string_view bytes);
 
+/// An indication as a listener reads it.
+struct ReceivedIndication {
+    std::string messageId;
+    core::InstanceValue indication;  ///< its class in the path; embedded instances as texts
+    core::InstanceValue source;      ///< SourceInstance; without properties where there is none
+};
+
+/// Reads the message of writeExport(), or another server's. Throws WireError for bytes that are none.
+/// Thread-safe, no state.
+ReceivedIndication readExport(std::string_view bytes);
+
+/// The answer of a listener that has taken it. Thread-safe, no state.
+std::string writeExportAnswer(std::string_view messageId);
+
 }  // namespace cimxml

@@ -49,6 +49,8 @@ std::vector<std::string_view> sortedNames(const Elements& elements) {
     return names;
 }
 
+}  // namespace
+
 core::InstanceValue readInstance(const pugi::xml_node& element) {
     expectElement(element, "INSTANCE");
     core::InstanceValue instance;
@@ -61,6 +63,8 @@ core::InstanceValue readInstance(const pugi::xml_node& element) {
         refuseElement(element, "has two properties of one name");
     return instance;
 }
+
+namespace {
 
 /// An INSTANCE does not say which of its properties are keys; the path in front of it does.
 void markKeys(core::InstanceValue& instance) {

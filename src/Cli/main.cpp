@@ -114,11 +114,13 @@ ExitStatus runVerb(const Arguments& arguments) {
     ProgressDisplay progress(printer);
     // Outlives the connection, which waits for the updates of this process.
     std::optional<NotedInterruptions> interruptions;
-    const Connection connection = arguments.server.url
-                                      ? openServer(arguments.server, [] { return interruptionAsked.load(); })
-                                      : openProviders(arguments.providers);
+    // What was subscribed is taken away again after an interruption, by requests that go on.
+    const bool mayEndRequests = arguments.verb != listen;
+    const auto isInterrupted = [mayEndRequests] { return mayEndRequests && interruptionAsked.load(); };
+    const Connection connection = arguments.server.url ? openServer(arguments.server, isInterrupted)
+                                                       : openProviders(arguments.providers);
     // Only now: at the prompt for the password, Ctrl-C still ends the program.
-    if (arguments.startsUpdate()) interruptions.emplace(!connection.isInProcess);
+    if (arguments.startsUpdate() || arguments.verb == listen) interruptions.emplace(!connection.isInProcess);
     // Polling costs a server a request each time; in process it is free.
     const std::chrono::milliseconds pause(connection.isInProcess ? 50 : 500);
     const Following following = {.pause = [pause] { std::this_thread::sleep_for(pause); },

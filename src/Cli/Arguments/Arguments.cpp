@@ -126,7 +126,7 @@ void chooseServer(Arguments& arguments) {
     const ProviderSettings& own = arguments.providers;
     const bool namesProviders = !own.configFile.empty() || !own.policyFile.empty() || own.adapters.backend ||
                                 own.adapters.description || !own.directory.empty();
-    constexpr Verb kOfServers[] = {showJobs, deleteJob, showStatus, releaseAdapter};
+    constexpr Verb kOfServers[] = {showJobs, deleteJob, showStatus, releaseAdapter, listen};
     const bool needsServer = std::ranges::find(kOfServers, arguments.verb) != std::end(kOfServers);
     if (arguments.server.url || namesProviders || !needsServer) return;
     if (::access(localSocket().c_str(), W_OK) == 0) arguments.server.url.emplace("unix:");
@@ -191,6 +191,8 @@ std::optional<Arguments> readArguments(int argc, char** argv) {
     requireOwnMachine(arguments);
     requireServerForUpload(arguments);
     chooseServer(arguments);
+    // Where subscriptions are made.
+    if (arguments.verb == listen) arguments.server.namespaceName = "interop";
     arguments.providers.isGuarded = arguments.verb == install || arguments.verb == rollback;
     return arguments;
 }

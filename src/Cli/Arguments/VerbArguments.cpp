@@ -147,6 +147,18 @@ void addHistoryVerb(CLI::App& app, Arguments& arguments) {
     verb->footer("At most 1,000; of a server only those among its newest 1,000.");
 }
 
+void addListen(CLI::App& app, Arguments& arguments) {
+    ListenOptions& options = arguments.options.listening;
+    CLI::App* verb = addVerb(app, arguments, "listen", listen,
+                             "Subscribe to what happens to jobs on a server, and print it as it comes");
+    addValue(
+        *verb, "--address", options.address, "ADDRESS",
+        "Address of this machine at which the server reaches it (default: 127.0.0.1, for a server here)");
+    addValue(*verb, "--port", options.port, "PORT", "Port to listen on (default: a free one)");
+    addValue(*verb, "--count", options.count, "N", "End after so many (default: when interrupted)");
+    verb->footer("The subscription is taken away at the end. With --json, one object a line.");
+}
+
 void addRegistration(CLI::App& app, Arguments& arguments) {
     RegistrationOptions& options = arguments.options.registration;
     CLI::App* verb = addVerb(app, arguments, "registration", showRegistration,
@@ -197,6 +209,7 @@ void addVerbs(CLI::App& app, Arguments& arguments) {
              "Adapter: its name, PCI address or object path")
         ->required();
     verb->footer("An adapter that a running job or check needs is not freed. Only quenx-cimd can do this.");
+    addListen(app, arguments);
     addModelVerbs(app, arguments);
     addRegistration(app, arguments);
 }

@@ -150,6 +150,7 @@ class RemoteOperations : public core::CimOperations {
     void deleteInstance(const core::CimPath& path) override {
         call("DeleteInstance", {{"InstanceName", path}}, Sending::Once);
     }
+    core::CimPath createInstance(const core::InstanceValue& instance) override;
     core::ClassChain getClass(const std::string& className) override;
     std::vector<core::ClassChain> enumerateClasses(const std::string& className, bool deep) override;
 
@@ -267,6 +268,13 @@ core::InstanceValue RemoteOperations::getInstance(const core::CimPath& path,
     // The answer does not repeat the path.
     instances.front().path = path;
     return std::move(instances.front());
+}
+
+core::CimPath RemoteOperations::createInstance(const core::InstanceValue& instance) {
+    const cimxml::InstanceBody body{instance.path.getClassName(), std::nullopt, instance.properties};
+    const auto paths = call("CreateInstance", {{"NewInstance", body}}, Sending::Once).paths;
+    if (paths.empty()) refuseAnswer("The server does not say what it has made.");
+    return paths.front();
 }
 
 core::MethodResult RemoteOperations::invokeMethod(const core::CimPath& path, const std::string& method,

@@ -36,7 +36,13 @@ struct HistoryOptions {
     std::string after;
 };
 
-/// The options and arguments of all verbs; each verb looks at its own.
+/// Where indications are taken, and how many.
+struct ListenOptions {
+    std::string address;      ///< of this machine; empty for loopback
+    std::uint16_t port = 0;   ///< 0 takes a free one
+    std::uint64_t count = 0;  ///< 0 for no end
+};
+
 /// What a word is completed to.
 enum class CandidateKind { None, Adapters, Identities, Jobs };
 struct CandidateOptions {
@@ -44,6 +50,7 @@ struct CandidateOptions {
     std::string prefix;  ///< only what begins so
 };
 
+/// The options and arguments of all verbs; each verb looks at its own.
 struct VerbOptions {
     UpdateOptions update;            ///< install, check; of activate and rollback the target
     ManyOptions many;                ///< install, on several adapters
@@ -56,7 +63,8 @@ struct VerbOptions {
     bool mayDisrupt = false;         ///< activate
     std::string adapter;             ///< release
     RegistrationOptions registration;
-    HistoryOptions history;  ///< history
+    HistoryOptions history;   ///< history
+    ListenOptions listening;  ///< listen
     CandidateOptions candidates;
 };
 
@@ -86,6 +94,9 @@ ExitStatus showHistory(Context& context, const VerbOptions& options);
 ExitStatus showStatus(Context& context, const VerbOptions& options);
 /// Needs a server that is quenx-cimd.
 ExitStatus releaseAdapter(Context& context, const VerbOptions& options);
+
+/// Prints what happens to jobs, as the server tells it. Needs a server, and its interop namespace.
+ExitStatus listen(Context& context, const VerbOptions& options);
 
 ExitStatus showInstances(Context& context, const VerbOptions& options);
 ExitStatus showAssociators(Context& context, const VerbOptions& options);
