@@ -8,6 +8,7 @@
 
 #include "Framework/Model/CimError.h"
 #include "Indications/Delivery/Destination.h"
+#include "Indications/Delivery/Pace.h"
 #include "Indications/StrictListener.h"
 #include "Support/Program.h"
 #include "Support/TempFolder.h"
@@ -50,7 +51,7 @@ DeliveryCounters settled(const Delivery& delivery, const std::string& destinatio
 }
 
 TEST(DeliveryTest, BringsEverythingInItsOrder) {
-    constexpr std::size_t kMany = 1000;
+    constexpr std::size_t kMany = 2'000;
     DeliverySettings settings = quick();
     settings.mostWaiting = kMany;
     StrictListener listener;
@@ -72,6 +73,23 @@ TEST(DeliveryTest, BringsEverythingInItsOrder) {
     for (std::size_t i = 0; i < kMany; ++i)
         ASSERT_EQ(bodies.at(i), numbered({"c", static_cast<std::int64_t>(i)}));
     EXPECT_EQ(listener.problems(), std::vector<std::string>());
+}
+
+TEST(DeliveryTest, SendsOneAddressABurstAndThenSoManyASecond) {
+    using std::chrono::seconds;
+    indications::Pace pace(20);
+    const indications::Clock::time_point begin{seconds(1000)};
+    for (int i = 0; i < 600; ++i) {
+        ASSERT_LE(pace.next("192.0.2.1"), begin) << i;
+        pace.count("192.0.2.1", begin);
+    }
+    pace.count("192.0.2.1", begin);
+    EXPECT_GT(pace.next("192.0.2.1"), begin);
+    EXPECT_LE(pace.next("192.0.2.1"), begin + std::chrono::milliseconds(51));
+    EXPECT_LE(pace.next("192.0.2.2"), begin);
+    // After half a minute without any, all of it is there again.
+    pace.count("192.0.2.1", begin + seconds(61));
+    EXPECT_LE(pace.next("192.0.2.1"), begin + seconds(32));
 }
 
 TEST(DeliveryTest, TriesAgainWhatMayHelp) {
