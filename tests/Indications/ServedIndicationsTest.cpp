@@ -37,7 +37,6 @@ std::string valueIn(const pugi::xml_node& instance, const char* property) {
 
 Told told(const std::string& body) {
     pugi::xml_document document;
-    EXPECT_EQ(test::faultsOf(body), "");
     EXPECT_TRUE(document.load_string(body.c_str()));
     const pugi::xml_node instance = document.select_node("//EXPPARAMVALUE/INSTANCE").node();
     const auto embedded = [&](const char* name, const char* property) {
@@ -108,6 +107,8 @@ TEST(ServedIndicationsTest, TellOneUpdateExactlyToWhoSubscribedAsCommonClientsDo
     update(daemon);
     const std::vector<Told> all = toldUntilDeletion(listener);
     ASSERT_GE(all.size(), 4U);
+    for (const std::string& body : listener.waitFor(all.size()))
+        EXPECT_EQ(test::faultsOf(body), "");
     EXPECT_EQ(all.front().className + all.front().state, "CIM_InstCreation2");
     std::string states;
     for (const Told& each : all) {
