@@ -75,7 +75,7 @@ struct UploadSettings {
 struct IndicationSettings {
     std::string file = "/var/lib/quenx/subscriptions.json";  ///< keeps them; empty: none outlives the daemon
     /// "subscriber" alone or nothing at all: the machine that subscribed; "any"; else networks.
-    std::vector<std::string> destinations;
+    std::vector<std::string> destinations{"subscriber"};
     std::size_t most = 100;    ///< destinations, and subscriptions
     std::string certificates;  ///< a file of authorities beside the system's; empty: none
     bool verify = true;        ///< the certificates of listeners
