@@ -24,6 +24,8 @@ class ExhaustedSink : public core::UpdateSink {
                  const std::string& text) noexcept override {
         EXPECT_FALSE(attempt.uri.empty());
         told[id] = text;
+        EXPECT_TRUE(id != ReasonId::PolicyUnreadable || attempt.mostRecords > 10'000'000)
+            << "it removes none";
         denials += id == ReasonId::PolicyUnreadable ? 1 : 0;
     }
     std::string problem() override { throw std::bad_alloc(); }

@@ -2,6 +2,7 @@
 #include "Framework/Requests/DeniedUpdates.h"
 
 #include <algorithm>
+#include <limits>
 #include <string_view>
 
 #include "Framework/Model/CimError.h"
@@ -70,12 +71,16 @@ void tellOfDenied(const std::string& method, const std::vector<Argument>& argume
         if (PolicyDecision::policy().history == utils::HistoryRule::Off) return;
         attempt.mostRecords = PolicyDecision::policy().historyRecords;
     } catch (const CimError&) {
-        // Of a policy that cannot be obeyed nothing is known, so the record is kept.
+        // Of a policy that cannot be obeyed nothing is known, so the record is kept, and removes no other.
+        attempt.mostRecords = std::numeric_limits<std::int64_t>::max();
     }
-    static Allowance allowance;
+    // Those who may only read must not use up what is there for administrators.
+    static Allowance ofReaders;
+    static Allowance ofOthers;
+    Allowance& allowance = attempt.caller.isAdministrator ? ofOthers : ofReaders;
     if (allowance.take()) sink->refused(attempt, 0, reason, text);
-} catch (const std::bad_alloc&) {
-    // What there is no memory for is left out.
+} catch (const std::exception&) {
+    // What there is no memory for is left out, and nobody's answer depends on a record.
 }
 
 }  // namespace core
