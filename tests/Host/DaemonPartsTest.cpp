@@ -17,6 +17,7 @@
 #include "Host/UnixSocket.h"
 #include "Support/TempFolder.h"
 #include "Support/Together.h"
+#include "Utils/Os/Linux/OwnFiles.h"
 
 namespace {
 
@@ -114,6 +115,8 @@ TEST(SpoolTest, RemovesWhatAKilledDaemonHasLeftOfAnUpload) {
                 ThrowsMessage<std::runtime_error>(HasSubstr("run: chmod 700 " + settings.directory)))
         << "others may need it as it is";
     fs::permissions(settings.directory, fs::perms(0700));
+    os::makeOwnFolder(folder / "named/with/");
+    EXPECT_EQ(fs::status(folder / "named/with").permissions(), fs::perms(0700));
     const host::Spool spool(settings);
     EXPECT_FALSE(fs::exists(folder / "images/.part-x"));
     EXPECT_TRUE(fs::exists(folder / "images/a/new.rom"));

@@ -131,6 +131,10 @@ void checkUploads(const UploadSettings& settings) try {
     const fs::path nearest = nearestOf(settings.directory);
     const bool isOwn =
         ::stat(nearest.c_str(), &status) == 0 && (status.st_uid == 0 || status.st_uid == ::geteuid());
+    const bool isOpen = isOwn && nearest == fs::absolute(settings.directory) && (status.st_mode & 077) != 0;
+    if (isOpen)
+        throw std::runtime_error("others may look into " + nearest.string() + "; run: chmod 700 " +
+                                 nearest.string());
     if (!isOwn)
         throw std::runtime_error(nearest.string() + " belongs to user " + std::to_string(status.st_uid) +
                                  ". " + advice);

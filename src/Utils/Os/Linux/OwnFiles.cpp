@@ -102,9 +102,10 @@ bool closeFolderToOthers(const std::string& path) {
     return folder.isOpen();
 }
 
-void makeOwnFolder(const std::string& path) {
-    const std::filesystem::path asked(path);
-    std::filesystem::create_directories(asked.parent_path());
+void makeOwnFolder(const std::string& named) {
+    // A slash at the end would make it one below itself.
+    const std::string path = named.substr(0, named.find_last_not_of('/') + 1);
+    std::filesystem::create_directories(std::filesystem::path(path).parent_path());
     if (::mkdir(path.c_str(), S_IRWXU) != 0 && errno != EEXIST) fail(errno, "cannot make the folder " + path);
     struct stat status {};
     const Descriptor folder = openOwnFolder(path, status);
