@@ -147,6 +147,8 @@ ExitStatus runAndReport(int argc, char** argv, std::optional<Arguments>& argumen
     try {
         arguments = readArguments(argc, argv);
         return arguments ? runVerb(*arguments) : ExitStatus::Done;
+    } catch (const PolicyRefusal& error) {
+        return report(json, error.status(), error.what(), error.advice(), core::ReasonId::PolicyUnreadable);
     } catch (const CommandError& error) {
         return report(json, error.status(), error.what(), error.advice());
     } catch (const core::CimError& error) {

@@ -145,6 +145,17 @@ void printHelp(const CLI::App& app, const std::string& name) {
     throw unknownVerb(app, name);
 }
 
+/// For whoever tells of it where it is not carried out.
+std::vector<core::Argument> orderOf(const UpdateOptions& update) {
+    const auto argument = [](const char* name, const std::string& text) {
+        return core::Argument{name, core::CimValue::of(core::CimType::String, text)};
+    };
+    std::vector<core::Argument> order;
+    if (!update.image.empty()) order.push_back(argument("URI", imageUri(update.image)));
+    if (!update.target.empty()) order.push_back(argument("Target", update.target));
+    return order;
+}
+
 }  // namespace
 
 std::optional<Arguments> readArguments(int argc, char** argv) {
@@ -193,7 +204,8 @@ std::optional<Arguments> readArguments(int argc, char** argv) {
     chooseServer(arguments);
     // Where subscriptions are made.
     if (arguments.verb == listen) arguments.server.namespaceName = "interop";
-    arguments.providers.isGuarded = arguments.verb == install || arguments.verb == rollback;
+    if (arguments.verb == install || arguments.verb == rollback)
+        arguments.providers.order = orderOf(arguments.options.update);
     return arguments;
 }
 

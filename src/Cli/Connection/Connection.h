@@ -5,6 +5,7 @@
 #include <memory>
 #include <optional>
 #include <string>
+#include <vector>
 
 #include "Cli/Connection/RefusalSink.h"
 #include "Cli/Display/Messages.h"
@@ -16,6 +17,12 @@ namespace cli {
 
 /// A request that was sent but got no usable answer: the server may have carried it out.
 class NoAnswer : public CommandError {
+  public:
+    using CommandError::CommandError;
+};
+
+/// The policy cannot be obeyed, so nothing is installed.
+class PolicyRefusal : public CommandError {
   public:
     using CommandError::CommandError;
 };
@@ -36,12 +43,16 @@ struct Connection {
 
 /// The providers to load; an empty text leaves the choice to the system.
 struct ProviderSettings {
-    std::string configFile;      ///< the providers' configuration file
-    std::string policyFile;      ///< the policy that they obey
-    bool isGuarded = false;      ///< the verb needs the leave of the policy
+    std::string configFile;  ///< the providers' configuration file
+    std::string policyFile;  ///< the policy that they obey
+    /// What the verb is going to ask to be installed, for which it needs the leave of the policy.
+    std::optional<std::vector<core::Argument>> order;
     ma::BackendChoice adapters;  ///< a state directory only with a description
     std::string directory;       ///< where the provider libraries are
 };
+
+/// Leaves a record and an audit line of an install that is refused before the service is asked.
+void tellOfRefusal(const std::vector<core::Argument>& order, core::ReasonId reason, const std::string& text);
 
 /// The name of the user who runs this program, else the number.
 std::string localUser();

@@ -12,7 +12,9 @@
 #include "Cli/Connection/Connection.h"
 #include "Cli/Display/Messages.h"
 #include "Cli/Display/Terminal.h"
+#include "Framework/Requests/Audit.h"
 #include "Framework/Requests/Caller.h"
+#include "Framework/Requests/DeniedUpdates.h"
 #include "Framework/Requests/ProviderSession.h"
 #include "History/Log/LogAgent.h"
 #include "MidAPI/ma.h"
@@ -83,9 +85,11 @@ void requirePolicy(core::ProviderSession& session, const ProviderSettings& setti
     const std::string problem = session.policy().problem();
     if (problem.empty()) return;
     const std::string text = "The policy cannot be obeyed: " + problem + ".";
-    if (settings.isGuarded)
-        throw CommandError(settings.policyFile.empty() ? ExitStatus::Failed : ExitStatus::WrongUse, text,
-                           kMendPolicy);
+    if (settings.order) {
+        tellOfRefusal(*settings.order, core::ReasonId::PolicyUnreadable, text);
+        throw PolicyRefusal(settings.policyFile.empty() ? ExitStatus::Failed : ExitStatus::WrongUse, text,
+                            kMendPolicy);
+    }
     std::cerr << "quenxctl: Warning: " << printable(text) << '\n' << kMendPolicy << '\n';
 }
 
@@ -113,6 +117,17 @@ void loadProviders(core::ProviderLibraries& providers, const std::string& named)
 
 }  // namespace
 
+void tellOfRefusal(const std::vector<core::Argument>& order, core::ReasonId reason, const std::string& text) {
+    const core::Argument* const target = core::findByName(order, "Target");
+    core::tellOfDenied("InstallFromURI", order, reason, text);
+    core::audit({core::CallerScope::current(),
+                 "InstallFromURI",
+                 target == nullptr ? "" : core::valueText(target->value),
+                 core::outcomeOf(core::CimStatus::AccessDenied, text),
+                 {.reason = reason}},
+                order);
+}
+
 std::string localUser() {
     const uid_t id = ::getuid();
     const passwd* entry = ::getpwuid(id);
@@ -124,12 +139,12 @@ Connection openProviders(const ProviderSettings& settings) {
     if (!settings.configFile.empty()) requireReadable(settings.configFile, "configuration file");
     const auto local = std::make_shared<LocalSession>(settings);
     core::ProviderSession* const session = &local->session;
-    requirePolicy(*session, settings);
     // The adapters first: providers may ask for them as soon as they are loaded.
     selectAdapters(settings.adapters);
     const auto history = history::History::wanted();
     const auto refusals = std::make_shared<RefusalSink>(history);
     session->keepHistory(refusals);
+    requirePolicy(*session, settings);
     loadProviders(session->libraries(), settings.directory);
     history::serveLog(*session, history);
     // The operations share ownership with the session, so the libraries stay loaded while they can be called.

@@ -49,6 +49,7 @@ PastImages pastImagesOf(const Connection& connection, const Adapter& adapter) {
     const std::vector<Record> records = recordsOf(connection, adapter, kMost);
     const auto look = records.empty() ? std::nullopt : history::lookAt(adapter.name);
     if (!look) return past;
+    Record first;  // of those in a row that wrote the last image
     for (const Record& record : records) {
         if (!isOfThisCard(record, *look) || record.outcome == history::kRefused) continue;
         const bool isWritten = record.outcome == history::kWritten;
@@ -56,8 +57,11 @@ PastImages pastImagesOf(const Connection& connection, const Adapter& adapter) {
         if (!isWritten || record.sha256.empty()) continue;
         if (!past.last) {
             past.last = record;
-        } else if (record.sha256 != past.last->sha256) {
-            if (isBefore(record, *past.last)) past.before = record;
+            first = record;
+        } else if (record.sha256 == past.last->sha256) {
+            first = record;
+        } else {
+            if (isBefore(record, first)) past.before = record;
             break;
         }
     }

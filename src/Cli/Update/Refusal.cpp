@@ -282,16 +282,16 @@ Reason explainImage(const Connection& connection, std::uint32_t returnValue, con
     }
 }
 
-/// What the table of reasons has on the trust in images.
-constexpr unsigned kFirstOfTrust = 600;
+/// What the table of reasons has on the policy and on the trust in images.
+constexpr unsigned kFirstOfPolicy = 500;
 constexpr unsigned kLastOfTrust = 699;
 
 /// An image that the policy does not let be installed may be right in every other way.
-Reason explainTrust(const Connection& connection, std::uint32_t returnValue, const Candidate& candidate,
-                    core::ReasonId id) {
+Reason explainPolicy(const Connection& connection, std::uint32_t returnValue, const Candidate& candidate,
+                     core::ReasonId id) {
     const core::Reason* row = core::findReason(id);
     const auto number = static_cast<unsigned>(id);
-    if (row == nullptr || number < kFirstOfTrust || number > kLastOfTrust) return std::nullopt;
+    if (row == nullptr || number < kFirstOfPolicy || number > kLastOfTrust) return std::nullopt;
     const std::string told = toldReason(connection, candidate.adapter.name, candidate.uri, returnValue, id);
     return Explanation{told.empty() ? row->text : sentence(told), row->advice};
 }
@@ -328,7 +328,7 @@ std::string permissionAdvice(const std::string& reason) {
 
 Explanation explainRefusal(const Connection& connection, std::uint32_t returnValue,
                            const Candidate& candidate, core::ReasonId id) {
-    if (const Reason untrusted = explainTrust(connection, returnValue, candidate, id)) return *untrusted;
+    if (const Reason untrusted = explainPolicy(connection, returnValue, candidate, id)) return *untrusted;
     // Who holds the adapter goes first: the image may be all right.
     Reason reason = explainHolder(connection, returnValue, candidate, id);
     // These two mean anything, of which nothing can be seen from afar.

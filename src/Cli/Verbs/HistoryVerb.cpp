@@ -93,8 +93,11 @@ void printRecords(std::ostream& out, const std::vector<Record>& records) {
 ExitStatus showHistory(Context& context, const VerbOptions& options) {
     const std::vector<Record> records = readHistory(context.connection, filterOf(options.history));
     if (options.history.asLines) {
-        for (const Record& record : records)
+        for (const Record& record : records) {
+            // Who asks for what comes after the last id must not miss how this one ends.
+            if (!options.history.after.empty() && record.isRunning()) break;
             context.out << jsonLine(record) << '\n';
+        }
     } else if (context.json) {
         Json list = Json::array();
         for (const Record& record : records)

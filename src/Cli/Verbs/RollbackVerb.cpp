@@ -6,6 +6,8 @@
 #include "Cli/Display/Terminal.h"
 #include "Cli/Update/PastImages.h"
 #include "Cli/Verbs/Outcome.h"
+#include "Framework/Model/CimError.h"
+#include "Framework/Requests/NotedCall.h"
 #include "Framework/Requests/PolicyDecision.h"
 #include "History/KeptImages.h"
 #include "Utils/Utils.h"
@@ -53,8 +55,6 @@ Record imageBefore(const Connection& connection, const Adapter& adapter) {
 
 /// Where images may lie, in the order in which they are looked for.
 std::vector<std::string> imageFolders(core::CimOperations& operations) {
-    // Whom the policy does not let install is told so before anything is looked for.
-    const core::PolicyDecision decision;
     const utils::Policy& policy = core::PolicyDecision::policy();
     std::vector<std::string> folders;
     if (!policy.keepImages.empty()) folders.push_back(policy.keepImages);
@@ -64,10 +64,23 @@ std::vector<std::string> imageFolders(core::CimOperations& operations) {
     return folders;
 }
 
+/// Whom the policy does not let install is told so before anything is looked for.
+core::PolicyDecision requireLeave(const std::string& adapter) {
+    const core::NotedCall noted;
+    try {
+        return core::PolicyDecision();
+    } catch (const core::CimError& denied) {
+        const core::Argument target{"Target", core::CimValue::of(core::CimType::String, adapter)};
+        tellOfRefusal({target}, noted.notes().reason, denied.what());
+        throw;
+    }
+}
+
 /// A file that has the image. Throws CommandError that says which one is missing.
 std::string fileOf(core::CimOperations& operations, const Record& image) {
     const std::int64_t bytes = image.bytes.value_or(0);
     const std::string path = localPath(image.uri).value_or("");
+    const core::PolicyDecision decision = requireLeave(image.adapter);
     const std::vector<std::string> folders = imageFolders(operations);
     for (const std::string& folder : folders)
         if (auto found = history::findImage(folder, image.sha256, bytes)) return *std::move(found);
