@@ -275,7 +275,10 @@ std::vector<Record> Store::find(const Filter& filter) {
     }
     if (filter.failedOnly) condition += " AND outcome NOT IN ('running', 'written')";
     condition += std::string(" ORDER BY id") + (filter.after ? "" : " DESC");
-    return select(condition + " LIMIT " + std::to_string(filter.most), parameters);
+    std::vector<Record> found = select(condition + " LIMIT " + std::to_string(filter.most), parameters);
+    for (Record& record : found)
+        if (record.isRunning()) record.versionsAfter.clear();  // what the flash holds until it ends
+    return found;
 }
 
 std::vector<Record> Store::running() {
