@@ -36,7 +36,8 @@ inline constexpr const char* kRelease = "/quenx/v1/release";
 /// PUT of a file, at this + SHA-256 of the image + "/" + NAME: {"uri": TEXT}. What belongs to an image, such
 /// as its signature, goes to the same place, with one of the ends below.
 inline constexpr std::string_view kImages = "/quenx/v1/images/";
-/// The ends of the names of what may belong to an image: its signature, its manifest and the signature of that.
+/// The ends of the names of what may belong to an image: its signature, its manifest and the signature of
+/// that.
 inline constexpr std::string_view kCompanions[] = {".p7s", ".manifest.toml", ".manifest.p7s"};
 /// The SHA-256 of the file that is sent, in hexadecimal digits.
 inline constexpr const char* kSumHeader = "Quenx-SHA256";
