@@ -54,7 +54,8 @@ case " ${presets[*]} " in
     *" kernel "*) if packaging/install-packages.sh kernel; then tests/kernel/prepare.sh; else have_kernel=false; fi ;;
 esac
 . tools/environment.sh # a proxy was for the packages
-export ASAN_OPTIONS="${ASAN_OPTIONS:-detect_stack_use_after_return=1}"
+# The second as in cmake/SanitizerDefaults.cpp.
+export ASAN_OPTIONS="${ASAN_OPTIONS:-detect_stack_use_after_return=1:intercept_tls_get_addr=0}"
 export UBSAN_OPTIONS="${UBSAN_OPTIONS:-print_stacktrace=1}"
 export TSAN_OPTIONS="${TSAN_OPTIONS:-halt_on_error=1 second_deadlock_stack=1}"
 
