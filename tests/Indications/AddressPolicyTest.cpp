@@ -10,6 +10,7 @@ namespace {
 
 using indications::AddressPolicy;
 using indications::machineAddress;
+using indications::MachineAddress;
 using indications::networkIn;
 
 bool allows(const AddressPolicy& policy, const std::string& address, std::uint16_t port = 5000) {
@@ -49,7 +50,8 @@ TEST(AddressPolicyTest, LetsIndicationsGoToTheSubscriberAlone) {
 }
 
 TEST(AddressPolicyTest, LetsThemGoNowhereThatIsNoOtherMachine) {
-    const auto policies = {AddressPolicy::anywhere(), toNetworks({"0.0.0.0/0", "::/0"})};
+    const MachineAddress elsewhere = machineAddress("198.51.100.4").value();
+    const auto policies = {AddressPolicy::anywhere(elsewhere), toNetworks({"0.0.0.0/0", "::/0"})};
     for (const AddressPolicy& policy : policies) {
         EXPECT_TRUE(allows(policy, "192.0.2.7") && allows(policy, "2001:db8::1") &&
                     allows(policy, "10.0.0.1"));
@@ -60,7 +62,10 @@ TEST(AddressPolicyTest, LetsThemGoNowhereThatIsNoOtherMachine) {
     }
     sockaddr local{};
     local.sa_family = AF_UNIX;
-    EXPECT_FALSE(AddressPolicy::anywhere().allows(local));
+    EXPECT_FALSE(AddressPolicy::anywhere(elsewhere).allows(local));
+    const auto here = AddressPolicy::anywhere(machineAddress("127.0.0.1").value());
+    EXPECT_TRUE(allows(here, "127.0.0.1") && allows(here, "::1") && allows(here, "192.0.2.7"));
+    EXPECT_FALSE(allows(here, "0.0.0.0") || allows(here, "169.254.169.254"));
 }
 
 TEST(AddressPolicyTest, ObeysAListOfNetworks) {

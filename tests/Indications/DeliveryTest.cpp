@@ -1,10 +1,15 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Indications/Delivery/Delivery.h"
 
+#include <dlfcn.h>
 #include <gtest/gtest.h>
+#include <netdb.h>
 
+#include <atomic>
 #include <cstdlib>
+#include <future>
 #include <optional>
+#include <string_view>
 
 #include "Framework/Model/CimError.h"
 #include "Indications/Delivery/Destination.h"
@@ -13,6 +18,24 @@
 #include "Support/Program.h"
 #include "Support/TempFolder.h"
 #include "Utils/Os/Linux/Thread.h"
+
+namespace {
+
+/// Look-ups of names that end in .slow.example last until it is true.
+std::atomic<bool> g_nameServerAnswers{false};
+
+}  // namespace
+
+/// In the place of the C library's, for libcurl.
+extern "C" [[gnu::visibility("default")]] int getaddrinfo(const char* name, const char* service,
+                                                          const addrinfo* hints, addrinfo** found) {
+    if (name != nullptr && std::string_view(name).ends_with(".slow.example")) {
+        g_nameServerAnswers.wait(false);
+        return EAI_AGAIN;
+    }
+    static const auto real = reinterpret_cast<decltype(&::getaddrinfo)>(::dlsym(RTLD_NEXT, "getaddrinfo"));
+    return real(name, service, hints, found);
+}
 
 namespace {
 
@@ -173,6 +196,27 @@ TEST(DeliveryTest, LosesTheOldestOfAListenerThatHangsAndNothingOfOthers) {
     EXPECT_LT(std::chrono::steady_clock::now() - begin, std::chrono::seconds(10));
 }
 
+TEST(DeliveryTest, IsNotHeldUpByANameServerThatDoesNotAnswer) {
+    StrictListener listener;
+    DeliverySettings settings = quick();
+    settings.connectTime = std::chrono::milliseconds(50);
+    settings.retries = 0;
+    Delivery delivery(settings);
+    delivery.add("slow", "http://listener.slow.example:5000/", toLoopback(), "s");
+    delivery.add("d", listener.url(), toLoopback(), "c");
+    delivery.send("slow", 1, numbered);
+    auto reached = std::async(std::launch::async, [&] {
+        const bool isGivenUp = settled(delivery, "slow", 1).givenUp == 1;
+        delivery.send("d", 1, numbered);
+        return isGivenUp && settled(delivery, "d", 1).delivered == 1;
+    });
+    const bool isInTime = reached.wait_for(std::chrono::seconds(30)) == std::future_status::ready;
+    g_nameServerAnswers = true;
+    g_nameServerAnswers.notify_all();
+    EXPECT_TRUE(isInTime);
+    EXPECT_TRUE(reached.get());
+}
+
 TEST(DeliveryTest, ConnectsToNoAddressThatThePolicyForbids) {
     StrictListener listener;
     const std::string port = std::to_string(listener.port());
@@ -182,7 +226,8 @@ TEST(DeliveryTest, ConnectsToNoAddressThatThePolicyForbids) {
                                  "[::ffff:127.0.0.1]", "0", "[::1]"}) {
         const std::string name = std::to_string(added++);
         delivery.add(name, std::string("http://") + spelling + ":" + port,
-                     indications::AddressPolicy::anywhere(), "c");
+                     indications::AddressPolicy::anywhere(indications::machineAddress("192.0.2.7").value()),
+                     "c");
         delivery.send(name, 1, numbered);
         EXPECT_EQ(settled(delivery, name, 1).givenUp, 1U) << spelling;
     }

@@ -116,8 +116,8 @@ AddressPolicy AddressPolicy::onlyTo(std::vector<Network> networks) {
     return policy;
 }
 
-AddressPolicy AddressPolicy::anywhere() {
-    AddressPolicy policy;
+AddressPolicy AddressPolicy::anywhere(const MachineAddress& subscriber) {
+    AddressPolicy policy = onlyTo(subscriber);
     policy.m_isAnywhere = true;
     return policy;
 }
@@ -128,7 +128,7 @@ bool AddressPolicy::allows(const sockaddr& address) const {
     const auto& [machine, port] = *parts;
     if (port < kFirstFreePort && port != 80 && port != 443 && !m_isList) return false;
     if (m_ownPorts != nullptr && m_ownPorts->has(port) && !m_isList) return false;
-    if (m_isAnywhere) return !isLoopback(machine);
+    if (m_isAnywhere && !isLoopback(machine)) return true;
     // A network that holds all of the world does not mean this machine.
     const bool isNamed = isInAny(machine, m_networks);
     if (!isNamed || !isLoopback(machine)) return isNamed;

@@ -51,8 +51,8 @@ class AddressPolicy {
     /// Machines in these networks, loopback only where one of them is of it. They decide of ports, too: all
     /// are open.
     static AddressPolicy onlyTo(std::vector<Network> networks);
-    /// All but loopback.
-    static AddressPolicy anywhere();
+    /// All machines; loopback only for who subscribed from there.
+    static AddressPolicy anywhere(const MachineAddress& subscriber);
 
     /// Nothing goes to these ports, unless a list of networks says where.
     /// @param ports  null for none

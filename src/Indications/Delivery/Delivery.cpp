@@ -35,6 +35,8 @@ struct Target {
     AddressPolicy policy;
     Queue queue;
     std::string address = {};  ///< where it was last
+    std::uint64_t toldOverflow = 0;
+    Clock::time_point toldAt = {};
 };
 
 }  // namespace
@@ -75,6 +77,12 @@ class Delivery::Courier : public utils::Thread {
         m_targets.erase(destination);
     }
 
+    DeliveryCounters counters(const std::string& destination) const {
+        const std::lock_guard lock(m_mutex);
+        const auto found = m_targets.find(destination);
+        return found == m_targets.end() ? DeliveryCounters() : found->second->queue.counters();
+    }
+
     const DeliverySettings& settings() const { return m_settings; }
 
   private:
@@ -87,6 +95,7 @@ class Delivery::Courier : public utils::Thread {
 
     void wake() noexcept { ::curl_multi_wakeup(m_multi.get()); }
     void makeRoom();
+    void tellOverflow();
     void beginDue();
     /// Whether something is under way there now that was not before.
     bool begin(const std::string& destination, const std::shared_ptr<Target>& target);
@@ -137,6 +146,28 @@ bool Delivery::Courier::begin(const std::string& destination, const std::shared_
     return false;
 }
 
+/// At most once a minute for each, with all that has come together.
+void Delivery::Courier::tellOverflow() {
+    constexpr std::chrono::minutes kRest{1};
+    std::vector<std::pair<std::string, std::uint64_t>> lost;
+    {
+        const std::lock_guard lock(m_mutex);
+        const auto now = Clock::now();
+        for (const auto& [name, target] : m_targets) {
+            const std::uint64_t overflow = target->queue.counters().overflow;
+            const bool isRested = target->toldOverflow == 0 || now - target->toldAt >= kRest;
+            if (overflow == target->toldOverflow || !isRested) continue;
+            lost.emplace_back(name, overflow - target->toldOverflow);
+            target->toldOverflow = overflow;
+            target->toldAt = now;
+        }
+    }
+    for (const auto& [name, count] : lost) {
+        QUENX_ERROR("Too much waits for the destination '%s': its %llu oldest indications are lost",
+                    utils::escapeForFormat(name).c_str(), static_cast<unsigned long long>(count));
+    }
+}
+
 void Delivery::Courier::beginDue() {
     const std::lock_guard lock(m_mutex);
     // From the one after the last, so that each has its turn.
@@ -162,10 +193,12 @@ void Delivery::Courier::end(UnderWay& done, CURLcode code) {
     }
     // Once for each change: a listener that is gone would fill the log.
     if (isFailing && !wasFailing) {
-        QUENX_ERROR("Indications do not reach the destination '%s': %s", done.destination.c_str(),
-                    result.problem.c_str());
+        QUENX_ERROR("Indications do not reach the destination '%s': %s",
+                    utils::escapeForFormat(done.destination).c_str(),
+                    utils::escapeForFormat(result.problem).c_str());
     } else if (wasFailing && !isFailing) {
-        QUENX_ERROR("Indications reach the destination '%s' again", done.destination.c_str());
+        QUENX_ERROR("Indications reach the destination '%s' again",
+                    utils::escapeForFormat(done.destination).c_str());
     }
 }
 
@@ -204,6 +237,7 @@ void Delivery::Courier::execute() {
     while (true) {
         if (isStopRequested() && !deadline) deadline = Clock::now() + m_settings.farewellTime;
         if (deadline && (m_underWay.empty() || Clock::now() >= *deadline)) return;
+        tellOverflow();
         if (!deadline) beginDue();
         int running = 0;
         ::curl_multi_perform(m_multi.get(), &running);
@@ -238,9 +272,7 @@ void Delivery::drop(const std::string& destination, std::uint64_t tag) {
 }
 
 DeliveryCounters Delivery::counters(const std::string& destination) const {
-    DeliveryCounters counters;
-    m_courier->with(destination, [&](Queue& queue) { counters = queue.counters(); });
-    return counters;
+    return m_courier->counters(destination);
 }
 
 }  // namespace indications

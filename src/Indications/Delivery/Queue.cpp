@@ -56,6 +56,7 @@ void Queue::end(Outcome outcome, const DeliverySettings& settings, Clock::time_p
     if (outcome == Outcome::Taken) {
         ++m_counters.delivered;
         m_counters.isFailing = false;
+        m_counters.failingFor = {};
         m_notBefore = {};
         erase(m_messages.begin());
         return;
@@ -66,7 +67,9 @@ void Queue::end(Outcome outcome, const DeliverySettings& settings, Clock::time_p
     const int tries = m_counters.isFailing ? 1 : settings.retries + 1;
     if (outcome == Outcome::Failed && m_messages.front().tries < tries) return;
     ++m_counters.givenUp;
+    if (!m_counters.isFailing) m_failingSince = now;
     m_counters.isFailing = true;
+    m_counters.failingFor = now - m_failingSince;
     erase(m_messages.begin());
 }
 

@@ -23,6 +23,7 @@ struct DeliverySettings {
     std::size_t mostWaiting = 1024;                 ///< messages of one destination
     std::size_t mostBytes = 8 << 20;                ///< of them
     std::size_t mostBytesOfAll = 32 << 20;
+    std::chrono::milliseconds abandonTime = std::chrono::hours(24);  ///< of a transient one; 0: never
     unsigned int perSecond = 0;  ///< messages to one address, on average; 0 sets no bound
     std::string certificates;    ///< a file of authorities beside the system's; empty for none
     bool verifies = true;        ///< false takes any certificate
@@ -35,6 +36,8 @@ struct DeliveryCounters {
     std::uint64_t overflow = 0;  ///< the oldest that had to make room
     std::size_t waiting = 0;
     bool isFailing = false;  ///< the last one was given up
+    /// From the first that was given up to the last, since one was delivered.
+    Clock::duration failingFor{};
 };
 
 /// One message.
@@ -86,6 +89,7 @@ class Queue {
     std::size_t m_bytes = 0;
     bool m_isUnderWay = false;
     Clock::time_point m_notBefore{};
+    Clock::time_point m_failingSince{};
     DeliveryCounters m_counters;
 };
 

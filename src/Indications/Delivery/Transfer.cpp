@@ -70,6 +70,8 @@ void Transfer::setLimits(const DeliverySettings& settings) {
     set(CURLOPT_DISALLOW_USERNAME_IN_URL, 1L);
     set(CURLOPT_NETRC, static_cast<long>(CURL_NETRC_IGNORED));
     set(CURLOPT_NOSIGNAL, 1L);
+    // A name server that does not answer would hold up everybody until the look-up has ended.
+    set(CURLOPT_QUICK_EXIT, 1L);
     // A connection that another destination made was looked at with that one's policy.
     set(CURLOPT_FRESH_CONNECT, 1L);
     set(CURLOPT_FORBID_REUSE, 1L);
@@ -101,7 +103,7 @@ std::size_t Transfer::takeAnswer(char* bytes, std::size_t size, std::size_t coun
 
 Transfer::Result Transfer::result(CURLcode code) const {
     if (m_isDenied && code != CURLE_OK)
-        return {Outcome::Failed, "the policy for destinations does not allow its address"};
+        return {Outcome::Refused, "indications.destinations does not allow its address"};
     if (code != CURLE_OK && !m_isTooLong) {
         const bool isExplained = m_error.front() != '\0';
         return {Outcome::Failed, isExplained ? m_error.data() : ::curl_easy_strerror(code)};

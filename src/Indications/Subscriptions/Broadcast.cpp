@@ -29,11 +29,12 @@ bool wantsAny(const Records& records) {
 
 }  // namespace
 
-Broadcast::Broadcast(DeliverySettings settings, std::string systemName, Policy policy,
+Broadcast::Broadcast(DeliverySettings settings, std::string systemName, Policy policy, Clearing clearing,
                      std::shared_ptr<core::CimOperations> implementation, std::shared_ptr<EventQueue> events)
     : m_settings(std::move(settings)),
       m_systemName(std::move(systemName)),
       m_policy(std::move(policy)),
+      m_clearing(std::move(clearing)),
       m_implementation(std::move(implementation)),
       m_events(std::move(events)),
       m_start(std::to_string(currentTime())),
@@ -109,10 +110,22 @@ std::optional<DeliveryCounters> Broadcast::counters(const DestinationKey& destin
     return delivery->counters(destination.text());
 }
 
+std::vector<DestinationKey> Broadcast::abandoned() const {
+    std::vector<DestinationKey> keys;
+    if (m_settings.abandonTime.count() == 0) return keys;
+    for (const Destination& each : records()->destinations) {
+        if (each.persistence != kTransient) continue;
+        const auto counted = counters(each.key);
+        if (counted && counted->failingFor >= m_settings.abandonTime) keys.push_back(each.key);
+    }
+    return keys;
+}
+
 void Broadcast::run(const std::stop_token& stop) {
     while (const auto event = m_events->next(stop)) {
         try {
             tell(*event);
+            if (!abandoned().empty()) m_clearing();
         } catch (const std::exception& error) {
             QUENX_ERROR("An event could not be told: %s", error.what());
         }

@@ -8,6 +8,7 @@
 #include <set>
 #include <string>
 #include <thread>
+#include <vector>
 
 #include "Framework/Events/EventInterest.h"
 #include "Framework/Requests/CimOperations.h"
@@ -27,9 +28,11 @@ class Broadcast {
   public:
     /// To where messages for a destination may go.
     using Policy = std::function<AddressPolicy(const Destination&)>;
+    /// Called by the thread when a destination has been abandoned.
+    using Clearing = std::function<void()>;
 
     /// @param implementation  knows the classes of instances; used until the end
-    Broadcast(DeliverySettings settings, std::string systemName, Policy policy,
+    Broadcast(DeliverySettings settings, std::string systemName, Policy policy, Clearing clearing,
               std::shared_ptr<core::CimOperations> implementation, std::shared_ptr<EventQueue> events);
     /// Ends what is under way, if it ends in time. The providers must still be there.
     ~Broadcast();
@@ -44,6 +47,8 @@ class Broadcast {
 
     /// What became of a destination's messages; nothing where none has been subscribed to.
     std::optional<DeliveryCounters> counters(const DestinationKey& destination) const;
+    /// Transient destinations that have taken nothing for so long that nobody can be there any more.
+    std::vector<DestinationKey> abandoned() const;
 
   private:
     void run(const std::stop_token& stop);
@@ -56,6 +61,7 @@ class Broadcast {
     const DeliverySettings m_settings;
     const std::string m_systemName;
     const Policy m_policy;
+    const Clearing m_clearing;
     const std::shared_ptr<core::CimOperations> m_implementation;
     const std::shared_ptr<EventQueue> m_events;
     const std::string m_start;        ///< of this one, unique over restarts

@@ -59,6 +59,11 @@ const Subscription* Records::subscription(const std::string& filter,
     });
 }
 
+void Records::erase(const DestinationKey& destination) {
+    std::erase_if(subscriptions, [&](const Subscription& each) { return each.destination == destination; });
+    std::erase_if(destinations, [&](const Destination& each) { return each.key == destination; });
+}
+
 std::vector<Filter> staticFilters(const std::string& namespaceName) {
     std::vector<Filter> filters;
     for (const StaticQuery& each : kStaticQueries) {

@@ -86,6 +86,9 @@ struct Records {
     const Filter* filter(const std::string& name) const;
     const Destination* destination(const DestinationKey& key) const;
     const Subscription* subscription(const std::string& filter, const DestinationKey& destination) const;
+
+    /// With the subscriptions that refer to it.
+    void erase(const DestinationKey& destination);
 };
 
 /// The filters that the server itself has for jobs, not compiled yet.

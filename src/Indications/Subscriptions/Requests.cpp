@@ -33,6 +33,12 @@ void requireShort(const char* what, const std::string& text, std::size_t most = 
     if (text.size() > most) refuse(std::string(what) + " is longer than " + std::to_string(most) + " bytes");
 }
 
+void requireName(const std::string& name) {
+    requireShort("Name", name, kLongestName);
+    const auto isControl = [](char each) { return static_cast<unsigned char>(each) < ' ' || each == '\x7F'; };
+    if (std::ranges::any_of(name, isControl)) refuse("Name holds a control character");
+}
+
 void requireShort(const Labels& labels) {
     requireShort("Caption", labels.caption);
     requireShort("Description", labels.description);
@@ -95,16 +101,24 @@ std::string nameOf(const InstanceValue& instance, const char* kind) {
     return std::string("Quenx:") + kind + ":" + std::to_string(currentTime()) + "-" + std::to_string(++count);
 }
 
-/// A number of which only some are supported.
-std::uint64_t requireNumber(const InstanceValue& instance, const char* name,
-                            std::initializer_list<std::uint64_t> allowed, CimStatus otherwise) {
-    const auto given = instance.get<std::uint64_t>(name);
-    if (!given) return *allowed.begin();
-    if (std::ranges::find(allowed, *given) != allowed.end()) return *given;
+using Allowed = std::initializer_list<std::uint64_t>;
+constexpr Allowed kPersistences = {kPermanent, kTransient, kOtherPersistence};
+constexpr Allowed kStates = {kEnabled, kDisabled};
+
+void requireOneOf(const Allowed& allowed, std::uint64_t given, const char* name, CimStatus otherwise) {
+    if (std::ranges::find(allowed, given) != allowed.end()) return;
     std::string right;
     for (const std::uint64_t each : allowed)
         right += (right.empty() ? "" : " or ") + std::to_string(each);
-    refuse(std::string(name) + " is " + std::to_string(*given) + "; here it can be " + right, otherwise);
+    refuse(std::string(name) + " is " + std::to_string(given) + "; here it can be " + right, otherwise);
+}
+
+/// A number of which only some are supported; the first of these where it is missing.
+std::uint64_t requireNumber(const InstanceValue& instance, const char* name, const Allowed& allowed,
+                            CimStatus otherwise = CimStatus::InvalidParameter) {
+    const std::uint64_t number = instance.get<std::uint64_t>(name).value_or(*allowed.begin());
+    requireOneOf(allowed, number, name, otherwise);
+    return number;
 }
 
 std::string plainNamespace(const std::string& name) {
@@ -171,10 +185,8 @@ Destination readDestination(const InstanceValue& instance) {
     destination.key = {core::sameName(instance.path.getClassName(), kHandler) ? kHandler : kDestination,
                        nameOf(instance, "destination")};
     destination.url = instance.text("Destination");
-    destination.persistence =
-        requireNumber(instance, "PersistenceType", {kPermanent, kTransient, kOtherPersistence},
-                      CimStatus::InvalidParameter);
-    requireNumber(instance, "Protocol", {kCimXml}, CimStatus::InvalidParameter);
+    destination.persistence = requireNumber(instance, "PersistenceType", kPersistences);
+    requireNumber(instance, "Protocol", {kCimXml});
     destination.labels = labelsOf(instance);
     return destination;
 }
@@ -183,8 +195,7 @@ Subscription readSubscription(const InstanceValue& instance) {
     requireNumber(instance, "OnFatalErrorPolicy", {2}, CimStatus::NotSupported);
     requireNumber(instance, "RepeatNotificationPolicy", {2}, CimStatus::NotSupported);
     Subscription subscription;
-    subscription.state =
-        requireNumber(instance, "SubscriptionState", {kEnabled, kDisabled}, CimStatus::InvalidParameter);
+    subscription.state = requireNumber(instance, "SubscriptionState", kStates);
     subscription.info = instance.text("SubscriptionInfo");
     subscription.duration = instance.get<std::uint64_t>("SubscriptionDuration");
     subscription.start = subscription.changed = currentTime();
@@ -218,7 +229,7 @@ void change(Subscription& subscription, const InstanceValue& instance, const Ins
 }
 
 void check(Filter& filter, const EventSources& sources) {
-    requireShort("Name", filter.name, kLongestName);
+    requireName(filter.name);
     requireShort("QueryLanguage", filter.language);
     requireShort(filter.labels);
     if (filter.namespaces.size() > kMostNamespaces)
@@ -235,7 +246,8 @@ void check(Filter& filter, const EventSources& sources) {
 }
 
 void check(const Destination& destination) {
-    requireShort("Name", destination.key.name, kLongestName);
+    requireName(destination.key.name);
+    requireOneOf(kPersistences, destination.persistence, "PersistenceType", CimStatus::InvalidParameter);
     requireShort(destination.labels);
     requireDestination(destination.url);
 }
@@ -244,6 +256,7 @@ void check(const Subscription& subscription) {
     // A hundred years: what is added to a time must fit.
     constexpr std::uint64_t kLongest = 100ULL * 366 * 86400;
     requireShort("SubscriptionInfo", subscription.info);
+    requireOneOf(kStates, subscription.state, "SubscriptionState", CimStatus::InvalidParameter);
     if (subscription.duration && (*subscription.duration == 0 || *subscription.duration > kLongest))
         refuse("SubscriptionDuration must be from 1 to " + std::to_string(kLongest) + " seconds");
 }

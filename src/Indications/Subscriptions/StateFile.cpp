@@ -3,9 +3,7 @@
 
 #include <sys/stat.h>
 
-#include <cerrno>
-#include <cstdio>
-#include <cstring>
+#include <filesystem>
 #include <nlohmann/json.hpp>
 
 #include "Framework/Model/CimError.h"
@@ -17,6 +15,7 @@ namespace indications {
 
 namespace {
 
+namespace fs = std::filesystem;
 using Json = nlohmann::ordered_json;
 
 constexpr int kVersion = 1;
@@ -134,26 +133,50 @@ std::string folderOf(const std::string& path) {
     return slash == std::string::npos ? "." : path.substr(0, slash + 1);
 }
 
+/// One that is free, or that the file has already.
+std::string nameForCopy(const std::string& path) {
+    constexpr int kMost = 9;
+    for (int i = 1; i <= kMost; ++i) {
+        std::string name = path + ".broken" + (i == 1 ? "" : "." + std::to_string(i));
+        if (!fs::exists(name) || fs::equivalent(name, path)) return name;
+    }
+    throw std::runtime_error(path + ".broken and eight more are there already; remove them");
+}
+
 }  // namespace
 
 Records StateFile::read() {
     if (m_path.empty()) return {};
-    std::string problem;
     try {
         const auto text = os::readTextFile(m_path);
-        return text ? parsed(*text) : Records();
+        if (!text) return {};
+        try {
+            return parsed(*text);
+        } catch (const std::bad_alloc&) {
+            throw;
+        } catch (const std::exception& error) {
+            const std::string aside = nameForCopy(m_path);
+            fs::rename(m_path, aside);
+            QUENX_ERROR("The subscriptions in %s cannot be read: %s. They are in %s now, and there are none",
+                        m_path.c_str(), error.what(), aside.c_str());
+        }
     } catch (const std::exception& error) {
-        problem = error.what();
+        m_obstacle = m_path + " cannot be read, and so is not written over: " + error.what();
+        QUENX_ERROR("%s. There are no subscriptions", m_obstacle.c_str());
     }
-    const std::string aside = m_path + ".broken";
-    if (::rename(m_path.c_str(), aside.c_str()) == 0) {
-        QUENX_ERROR("The subscriptions in %s cannot be read: %s. They are in %s now, and there are none",
-                    m_path.c_str(), problem.c_str(), aside.c_str());
-        return {};
-    }
-    m_obstacle = m_path + " cannot be read, and so is not written over: " + problem;
-    QUENX_ERROR("%s. There are no subscriptions", m_obstacle.c_str());
     return {};
+}
+
+void StateFile::keepCopy() {
+    try {
+        const std::string copy = nameForCopy(m_path);
+        // Writing puts another file in its place, so this name keeps what it has now.
+        if (!fs::exists(copy)) fs::create_hard_link(m_path, copy);
+        QUENX_ERROR("What is passed over stays in %s", copy.c_str());
+    } catch (const std::exception& error) {
+        m_obstacle = m_path + " holds what is passed over, and no copy can be made: " + error.what();
+        QUENX_ERROR("%s. Subscriptions cannot be changed", m_obstacle.c_str());
+    }
 }
 
 void StateFile::write(const Records& records) {

@@ -15,9 +15,11 @@ class StateFile {
     /// @param path  empty: nothing is kept
     explicit StateFile(std::string path) : m_path(std::move(path)) {}
 
-    /// What was written last; nothing where there is no file. A file that cannot be used is renamed, with a
-    /// line in the log; where that fails, too, nothing is written over it.
+    /// What was written last; nothing where there is no file. A file that makes no sense is renamed, and one
+    /// that cannot be read or renamed is not written over; both with a line in the log.
     Records read();
+    /// Keeps a copy of the file as it is now, since the next write leaves something out.
+    void keepCopy();
     /// Writes all but the server's own. CimError (failed) when it cannot be: the old file is as it was.
     void write(const Records& records);
 

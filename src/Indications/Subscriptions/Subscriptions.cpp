@@ -77,7 +77,7 @@ Subscriptions::Subscriptions(SubscriptionSettings settings, std::vector<std::str
       m_records(std::make_shared<const Records>()),
       m_broadcast(
           m_settings.delivery, m_systemName,
-          [this](const Destination& destination) { return policyFor(destination); },
+          [this](const Destination& destination) { return policyFor(destination); }, [this] { clear(); },
           std::move(implementation), std::move(events)) {}
 
 std::shared_ptr<const Records> Subscriptions::records() const {
@@ -91,13 +91,12 @@ EventSources Subscriptions::sources() const {
 
 AddressPolicy Subscriptions::policyFor(const Destination& destination) const {
     const DestinationRule& rule = m_settings.destinations;
-    auto policy = AddressPolicy::anywhere();
+    // A client of the Unix socket has no address: it is on this machine.
+    const auto known = machineAddress(destination.address);
+    const MachineAddress subscriber = known ? *known : machineAddress("127.0.0.1").value();
+    auto policy = AddressPolicy::onlyTo(subscriber);
     if (rule.kind == DestinationRule::Kind::Listed) policy = AddressPolicy::onlyTo(rule.networks);
-    if (rule.kind == DestinationRule::Kind::Subscriber) {
-        // A client of the Unix socket has no address: it is on this machine.
-        const auto address = machineAddress(destination.address);
-        policy = AddressPolicy::onlyTo(address ? *address : machineAddress("127.0.0.1").value());
-    }
+    if (rule.kind == DestinationRule::Kind::Any) policy = AddressPolicy::anywhere(subscriber);
     policy.deny(m_settings.ownPorts);
     return policy;
 }
@@ -114,7 +113,7 @@ void Subscriptions::resume() {
         }
         all.filters.push_back(std::move(filter));
     }
-    accept(all, m_file.read());
+    if (!accept(all, m_file.read())) m_file.keepCopy();
     auto shared = std::make_shared<const Records>(std::move(all));
     try {
         m_broadcast.prepare(*shared);
@@ -127,11 +126,13 @@ void Subscriptions::resume() {
 }
 
 /// What was kept is looked at like what a client sends: another version, or a person, may have written it.
-void Subscriptions::accept(Records& all, Records kept) {
-    const auto take = [](const std::string& what, const auto& step) {
+bool Subscriptions::accept(Records& all, Records kept) {
+    bool isAll = true;
+    const auto take = [&](const std::string& what, const auto& step) {
         try {
             step();
         } catch (const CimError& error) {
+            isAll = false;
             QUENX_ERROR("%s is passed over: %s", utils::escapeForFormat(what).c_str(), error.what());
         }
     };
@@ -175,6 +176,7 @@ void Subscriptions::accept(Records& all, Records kept) {
             all.subscriptions.push_back(std::move(subscription));
         });
     }
+    return isAll;
 }
 
 bool Subscriptions::serves(std::string_view className) {
@@ -260,7 +262,21 @@ Records Subscriptions::changeable() const {
     Records copy = *records();
     const std::uint64_t now = currentTime();
     std::erase_if(copy.subscriptions, [&](const Subscription& each) { return each.isExpired(now); });
+    for (const DestinationKey& each : m_broadcast.abandoned()) {
+        QUENX_ERROR(
+            "The destination '%s' and its subscriptions are removed: it has taken nothing for too long",
+            utils::escapeForFormat(each.text()).c_str());
+        copy.erase(each);
+    }
     return copy;
+}
+
+/// Of clients that have gone without a word nothing stays for ever.
+void Subscriptions::clear() noexcept try {
+    const std::lock_guard changing(m_changes);
+    publish(changeable());
+} catch (const std::exception& error) {
+    QUENX_ERROR("Subscriptions of clients that have gone could not be removed: %s", error.what());
 }
 
 void Subscriptions::publish(Records changed) {

@@ -73,8 +73,10 @@ class Subscriptions {
     core::CimPath createDestination(Records& records, const core::InstanceValue& instance);
     core::CimPath createSubscription(Records& records, const core::InstanceValue& instance);
     Records changeable() const;
+    void clear() noexcept;
     void publish(Records records);
-    void accept(Records& all, Records kept);
+    /// Whether all of them were accepted.
+    bool accept(Records& all, Records kept);
 
     const Filter* findFilter(const Records& records, const core::CimPath& path) const;
     const Destination* findDestination(const Records& records, const core::CimPath& path) const;
