@@ -81,6 +81,8 @@ struct IndicationSettings {
     bool verify = true;        ///< the certificates of listeners
     unsigned int retries = 3;  ///< tries after the first
     std::chrono::seconds retryTime{30};
+    /// After which a transient destination that takes nothing is removed; 0: never.
+    std::chrono::seconds abandonTime{24 * 3600};
     unsigned int perSecond = 20;  ///< messages to one address; 0 sets no bound
 };
 

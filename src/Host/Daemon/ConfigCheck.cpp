@@ -142,6 +142,12 @@ void checkUploads(const UploadSettings& settings) try {
     warn(std::string("No images are taken: ") + error.what());
 }
 
+void checkSubscriptionsFile(const std::string& file) {
+    const bool isSet = file != IndicationSettings{}.file;
+    if (file.empty() || (!isSet && !fs::exists(file))) return;
+    requireWritable(file, "Set indications.file to another file, or to \"\".");
+}
+
 }  // namespace
 
 int checkConfiguration(const Settings& settings) {
@@ -173,6 +179,7 @@ int checkConfiguration(const Settings& settings) {
     check([&] { utils::PolicyFile(settings.policy).current(); });
     check([&] { checkProviders(settings); });
     check([&] { checkAdapters(settings); });
+    check([&] { checkSubscriptionsFile(settings.indications.file); });
     checkUploads(settings.uploads);
     if (status == 0) std::cout << "The configuration is valid.\n";
     return status;

@@ -1,7 +1,11 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Host/Daemon/IndicationSettings.h"
 
+#include <gnutls/x509.h>
+
 #include <stdexcept>
+
+#include "Utils/Os/Linux/linux.h"
 
 namespace host {
 
@@ -25,6 +29,26 @@ indications::DestinationRule ruleOf(const std::vector<std::string>& destinations
     return rule;
 }
 
+/// libcurl would tell of it with each indication, and nobody would hear any.
+void requireCertificates(const std::string& file) {
+    if (file.empty()) return;
+    const std::string advice =
+        " Check indications.certificates, or set it to \"\" for the system's authorities.";
+    auto text = os::readTextFile(file);
+    if (!text)
+        throw std::runtime_error("indications.certificates is " + file + ", which does not exist." + advice);
+    const gnutls_datum_t bytes{reinterpret_cast<unsigned char*>(text->data()),
+                               static_cast<unsigned int>(text->size())};
+    gnutls_x509_crt_t* list = nullptr;
+    unsigned int count = 0;
+    const int status = ::gnutls_x509_crt_list_import2(&list, &count, &bytes, GNUTLS_X509_FMT_PEM, 0);
+    if (status < 0)
+        throw std::runtime_error("Cannot use " + file + ": " + ::gnutls_strerror(status) + advice);
+    for (unsigned int i = 0; i < count; ++i)
+        ::gnutls_x509_crt_deinit(list[i]);
+    ::gnutls_free(list);
+}
+
 }  // namespace
 
 indications::SubscriptionSettings subscriptionSettings(const Settings& settings) {
@@ -33,10 +57,12 @@ indications::SubscriptionSettings subscriptionSettings(const Settings& settings)
     result.destinations = ruleOf(said.destinations);
     result.file = said.file;
     result.most = said.most;
+    requireCertificates(said.certificates);
     result.delivery.certificates = said.certificates;
     result.delivery.verifies = said.verify;
     result.delivery.retries = static_cast<int>(said.retries);
     result.delivery.retryPause = said.retryTime;
+    result.delivery.abandonTime = said.abandonTime;
     result.delivery.perSecond = said.perSecond;
     return result;
 }

@@ -6,7 +6,8 @@
 
 namespace host {
 
-/// What the settings say of subscriptions. Throws std::runtime_error where destinations name no networks.
+/// What the settings say of subscriptions. Throws std::runtime_error where destinations name no networks, or
+/// the file of authorities holds none.
 indications::SubscriptionSettings subscriptionSettings(const Settings& settings);
 
 }  // namespace host

@@ -131,6 +131,8 @@ std::vector<SettingsField> otherFields(Settings& s) {
         {"indications.verify", &s.indications.verify, "check the certificates of listeners"},
         {"indications.retries", &s.indications.retries, "further tries after one that failed", 0, 100},
         {"indications.retry_seconds", &s.indications.retryTime, "time between two tries", 1, kDay},
+        {"indications.abandon_seconds", &s.indications.abandonTime,
+         "time after which transient destinations that take nothing are removed; 0 for never", 0, 366 * kDay},
         {"indications.per_second", &s.indications.perSecond,
          "most indications in a second to one address, on average; 0 for no bound", 0, 100000},
         {"providers.directory", &s.providers, "directory of the provider libraries"},
