@@ -2,86 +2,21 @@
 // quenx-cimd tells listeners what happens to its jobs.
 #include <gmock/gmock.h>
 
-#include <filesystem>
-#include <fstream>
-#include <sstream>
-#include <thread>
-
-#include "Indications/StrictListener.h"
+#include "Indications/OneUpdate.h"
 #include "Indications/SubscriptionClient.h"
+#include "Indications/Told.h"
 
 namespace {
 
+using test::kAll;
 using test::RunningDaemon;
 using test::StrictListener;
 using test::SubscriptionClient;
-using ::testing::ElementsAre;
+using test::Told;
+using test::toldOf;
+using test::toldUntilDeletion;
+using test::update;
 using ::testing::HasSubstr;
-
-constexpr const char* kAll = "SELECT * FROM CIM_InstIndication WHERE SourceInstance ISA CIM_ConcreteJob";
-
-/// An indication as a listener reads it.
-struct Told {
-    std::string className;
-    std::string filter;
-    std::string context;
-    std::string state;
-    std::string before;  ///< state before a modification
-    std::string percent;
-    long number = -1;
-};
-
-std::string valueIn(const pugi::xml_node& instance, const char* property) {
-    return instance.find_child_by_attribute("NAME", property).child("VALUE").text().get();
-}
-
-Told told(const std::string& body) {
-    pugi::xml_document document;
-    EXPECT_TRUE(document.load_string(body.c_str()));
-    const pugi::xml_node instance = document.select_node("//EXPPARAMVALUE/INSTANCE").node();
-    const auto embedded = [&](const char* name, const char* property) {
-        pugi::xml_document inner;
-        inner.load_string(valueIn(instance, name).c_str());
-        return valueIn(inner.child("INSTANCE"), property);
-    };
-    return {instance.attribute("CLASSNAME").value(),       valueIn(instance, "IndicationFilterName"),
-            valueIn(instance, "SequenceContext"),          embedded("SourceInstance", "JobState"),
-            embedded("PreviousInstance", "JobState"),      embedded("SourceInstance", "PercentComplete"),
-            std::stol(valueIn(instance, "SequenceNumber"))};
-}
-
-std::vector<Told> toldOf(StrictListener& listener, std::size_t count) {
-    std::vector<Told> all;
-    for (const std::string& body : listener.waitFor(count))
-        all.push_back(told(body));
-    EXPECT_THAT(listener.problems(), ElementsAre());
-    return all;
-}
-
-/// Waits for the indication of a job's deletion, which is its last.
-std::vector<Told> toldUntilDeletion(StrictListener& listener) {
-    for (std::size_t count = 4;; ++count) {
-        std::vector<Told> all = toldOf(listener, count);
-        if (all.size() < count || all.back().className == "CIM_InstDeletion") return all;
-    }
-}
-
-/// Has an update run and ended, and its job deleted.
-void update(const RunningDaemon& daemon) {
-    const std::string service = daemon.lines("ein", "Quenx_SoftwareInstallationService").at(0);
-    const std::string port = daemon.lines("ein", "Quenx_EthernetPort").at(0);
-    const test::ProgramResult called = daemon.wbemcli(
-        "cm", service,
-        {"InstallFromURI.URI=\"file://" + daemon.image() + "\",InstallOptions=5,Target=" + port});
-    ASSERT_TRUE(test::contains(called.out, "InstallFromURI: 4096")) << called.out << called.error;
-    const std::string job = daemon.lines("ein", "Quenx_ConcreteJob").at(0);
-    for (int round = 0; round < 600; ++round) {
-        const std::string state = daemon.lines("gi", job, {"JobState"}).at(0);
-        if (test::contains(state, "JobState=7") || test::contains(state, "JobState=10")) break;
-        std::this_thread::sleep_for(std::chrono::milliseconds(20));
-    }
-    EXPECT_EQ(daemon.wbemcli("di", job).status, 0);
-}
 
 TEST(ServedIndicationsTest, TellOneUpdateExactlyToWhoSubscribedAsCommonClientsDo) {
     const RunningDaemon daemon;
@@ -260,70 +195,6 @@ TEST(ServedIndicationsTest, UnderstandOlderClients) {
     EXPECT_EQ(client.remove(path).error, 0);
     EXPECT_EQ(client.remove(filterPath).error, 0);
     EXPECT_EQ(client.remove(handlerPath).error, 0);
-}
-
-TEST(ServedIndicationsTest, GoOnAfterARestartWithNewNumbers) {
-    const test::TempFolder folder;
-    const std::string file = folder / "kept.json";
-    const std::vector<std::string> options{"--indications-file", file};
-    StrictListener listener;
-    std::string context;
-    {
-        RunningDaemon daemon(options);
-        const SubscriptionClient client(daemon);
-        client.madeSubscription(client.madeFilter(kAll), client.madeDestination(listener.url()));
-        update(daemon);
-        context = toldUntilDeletion(listener).back().context;
-        EXPECT_EQ(daemon.stop().status, 0);
-    }
-    EXPECT_EQ(std::filesystem::status(file).permissions(),
-              std::filesystem::perms::owner_read | std::filesystem::perms::owner_write);
-    const std::size_t before = listener.waitFor(1).size();
-    RunningDaemon daemon(options);
-    const SubscriptionClient client(daemon);
-    EXPECT_EQ(client.count("CIM_IndicationSubscription"), 1U);
-    update(daemon);
-    const std::vector<Told> all = toldOf(listener, before + 4);
-    EXPECT_EQ(all[before].number, 0);
-    EXPECT_EQ(all[before].className, "CIM_InstCreation");
-    EXPECT_NE(all[before].context, context);
-}
-
-TEST(ServedIndicationsTest, StartWithABrokenFileAndRefuseWhatTheyCannotKeep) {
-    const test::TempFolder folder;
-    const std::string file = folder.write("kept.json", "{\"version\": 7, \"filters\": []}");
-    {
-        const RunningDaemon daemon({"--indications-file", file});
-        const SubscriptionClient client(daemon);
-        EXPECT_FALSE(std::filesystem::exists(file));
-        EXPECT_TRUE(std::filesystem::exists(file + ".broken"));
-        client.madeFilter(kAll);
-        EXPECT_TRUE(std::filesystem::exists(file));
-    }
-    // Half of it, a filter that nothing fits any more, and a subscription to nothing.
-    std::ofstream(file) << R"({"version": 1, "filters": [{"name": "old", "namespaces": ["root/cimv2"],
-        "language": "WQL", "query": "SELECT * FROM CIM_InstCreation WHERE SourceInstance ISA Gone_Class"}],
-        "destinations": [{"class": "CIM_ListenerDestinationCIMXML", "name": "d", "url": "http://localhost:9",
-        "persistence": 2}, {"class": "CIM_ListenerDestinationCIMXML", "name": "e", "url": "file:///x",
-        "persistence": 2}], "subscriptions": [
-        {"filter": "old", "class": "CIM_ListenerDestinationCIMXML", "destination": "d", "state": 2, "start": 1,
-        "changed": 1}, {"filter": "old", "class": "CIM_ListenerDestinationCIMXML", "destination": "e",
-        "state": 2, "start": 1, "changed": 1}]})";
-    const RunningDaemon daemon({"--indications-file", file});
-    const SubscriptionClient client(daemon);
-    EXPECT_EQ(client.count("CIM_ListenerDestinationCIMXML"), 1U);
-    const test::CimAnswer kept =
-        client.call("EnumerateInstances", client.className("CIM_IndicationSubscription"));
-    const auto states = kept.document.select_nodes("//PROPERTY[@NAME='SubscriptionState']/VALUE");
-    ASSERT_EQ(states.size(), 1U);
-    EXPECT_EQ(std::string(states.first().node().text().get()), "4");
-    // A folder in the place of the file that is written next: what cannot be kept is not there.
-    std::filesystem::remove(file);
-    std::filesystem::create_directory(file);
-    EXPECT_EQ(
-        client.create("CIM_IndicationFilter", SubscriptionClient::filterProperties(kAll, "WQL", "n")).error,
-        1);
-    EXPECT_EQ(client.count("CIM_IndicationFilter"), 7U);
 }
 
 TEST(ServedIndicationsTest, ReachAHundredSubscribersOfOneJobWithoutAGap) {

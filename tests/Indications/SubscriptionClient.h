@@ -166,13 +166,6 @@ class SubscriptionClient {
                                               "\">" + properties + "</INSTANCE></VALUE.NAMEDINSTANCE>"));
     }
 
-  private:
-    static std::string escaped(const std::string& text) {
-        std::string xml;
-        for (const char each : text)
-            xml += each == '<' ? "&lt;" : each == '&' ? "&amp;" : std::string(1, each);
-        return xml;
-    }
     static std::string xmlOf(const pugi::xml_node& node) {
         struct Writer : pugi::xml_writer {
             std::string text;
@@ -182,6 +175,14 @@ class SubscriptionClient {
         } writer;
         node.print(writer, "", pugi::format_raw);
         return writer.text;
+    }
+
+  private:
+    static std::string escaped(const std::string& text) {
+        std::string xml;
+        for (const char each : text)
+            xml += each == '<' ? "&lt;" : each == '&' ? "&amp;" : std::string(1, each);
+        return xml;
     }
 
     const int m_port;

@@ -23,7 +23,7 @@ using core::InstanceValue;
 
 constexpr const char* kQuery = "SELECT * FROM CIM_InstIndication WHERE SourceInstance ISA CIM_ConcreteJob";
 /// How often the server is asked whether it is still there.
-constexpr std::chrono::seconds kLook{10};
+constexpr std::chrono::seconds kLook{5};
 
 core::CimOperations& requireInterop(const Connection& connection) {
     if (!connection.isInProcess) return *connection.operations;
@@ -79,8 +79,19 @@ class OwnSubscription {
     OwnSubscription(const OwnSubscription&) = delete;
     OwnSubscription& operator=(const OwnSubscription&) = delete;
 
-    /// Throws where the server is gone, or has the subscription no more.
-    void look() { m_operations.getInstance(m_made.back(), std::vector<std::string>{"SubscriptionState"}); }
+    /// Whether what the server tells gets here, as far as it knows. Throws where the server is gone, or has
+    /// the subscription no more.
+    bool isReached() try {
+        constexpr std::uint64_t kDegraded = 3;
+        const std::vector<std::string> wanted{"SubscriptionState"};
+        return m_operations.getInstance(m_made.back(), wanted).number(wanted.front()) != kDegraded;
+    } catch (const core::CimError& error) {
+        if (error.status() != core::CimStatus::NotFound) throw;
+        m_made.clear();
+        throw CommandError(
+            ExitStatus::Failed, "The server has this subscription no more.",
+            "An administrator has deleted it, or the server has begun anew without it. Listen again.");
+    }
 
     /// Whether the server has nothing of it any more.
     bool takeAway() noexcept {
@@ -153,6 +164,7 @@ ExitStatus listen(Context& context, const VerbOptions& options) {
     OwnSubscription subscription(operations, name, listener.url());
     context.error << "Listening at " << listener.url() << " until it is interrupted.\n";
     auto looked = std::chrono::steady_clock::now();
+    bool wasReached = true;
     for (std::uint64_t count = 0; options.listening.count == 0 || count < options.listening.count;) {
         if (context.following.interrupted()) break;
         if (const auto delivered = listener.next(std::chrono::milliseconds(200))) {
@@ -160,6 +172,7 @@ ExitStatus listen(Context& context, const VerbOptions& options) {
                 const auto received = cimxml::readExport(delivered->body);
                 Listener::answer(*delivered, cimxml::writeExportAnswer(received.messageId));
                 print(context, received);
+                if (!context.out) break;  // nobody reads it any more
                 ++count;
             } catch (const cimxml::WireError&) {
                 Listener::answer(*delivered, "");
@@ -167,7 +180,13 @@ ExitStatus listen(Context& context, const VerbOptions& options) {
         }
         if (std::chrono::steady_clock::now() - looked < kLook) continue;
         looked = std::chrono::steady_clock::now();
-        subscription.look();
+        const bool isReached = subscription.isReached();
+        if (wasReached && !isReached) {
+            context.error << "quenxctl: The server cannot reach " << listener.url() << "; its log says why.\n"
+                          << "Name an address of this machine with --address that it can reach, and that its "
+                             "setting indications.destinations allows.\n";
+        }
+        wasReached = isReached;
     }
     if (subscription.takeAway()) return ExitStatus::Done;
     throw CommandError(ExitStatus::Failed, "The server still has the subscription " + name + ".",

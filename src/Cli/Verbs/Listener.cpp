@@ -9,6 +9,7 @@
 #include <cerrno>
 #include <cstring>
 #include <memory>
+#include <vector>
 
 #include "Cli/Display/Messages.h"
 #include "Utils/Utils.h"
@@ -22,6 +23,7 @@ using Clock = std::chrono::steady_clock;
 constexpr std::size_t kLongestHead = 16 << 10;
 constexpr std::size_t kLongestBody = 4 << 20;
 constexpr std::chrono::seconds kWholeTime{10};  ///< for one message
+constexpr std::size_t kMostIncoming = 16;
 
 /// Numbers only: which of a name's addresses would be listened on is nothing to guess.
 std::unique_ptr<addrinfo, decltype(&::freeaddrinfo)> placeOf(const std::string& address, std::uint16_t port) {
@@ -42,32 +44,6 @@ std::unique_ptr<addrinfo, decltype(&::freeaddrinfo)> placeOf(const std::string& 
         "Cannot listen on " + address + " port " + std::to_string(port) + ": " + std::strerror(errno) + ".",
         "Name an address of this machine with --address, and a free port with --port.");
 }
-
-/// Whether something comes in time.
-bool waitFor(int socket, std::chrono::milliseconds patience) {
-    pollfd waiting{socket, POLLIN, 0};
-    return ::poll(&waiting, 1, static_cast<int>(std::max<std::int64_t>(patience.count(), 0))) > 0;
-}
-
-/// Bytes of one connection until there are so many, or an end; false where it is too slow.
-class Reading {
-  public:
-    explicit Reading(int socket) : m_socket(socket) {}
-
-    bool readMore(std::string& bytes) const {
-        const auto left = std::chrono::duration_cast<std::chrono::milliseconds>(m_deadline - Clock::now());
-        if (!waitFor(m_socket, left)) return false;
-        std::array<char, 16384> piece{};
-        const ssize_t got = ::recv(m_socket, piece.data(), piece.size(), 0);
-        if (got <= 0) return false;
-        bytes.append(piece.data(), static_cast<std::size_t>(got));
-        return true;
-    }
-
-  private:
-    const int m_socket;
-    const Clock::time_point m_deadline = Clock::now() + kWholeTime;
-};
 
 std::size_t lengthIn(std::string_view head) {
     constexpr std::string_view kName = "\r\ncontent-length:";
@@ -117,29 +93,57 @@ std::string Listener::url() const {
     return "http://" + (isIpv6 ? "[" + m_address + "]" : m_address) + ":" + std::to_string(m_port) + m_path;
 }
 
+void Listener::accept() {
+    os::Descriptor connection(::accept4(m_socket.number(), nullptr, nullptr, SOCK_CLOEXEC | SOCK_NONBLOCK));
+    if (!connection.isOpen()) return;
+    // A server sends one at a time: many at once are somebody else's.
+    if (m_incoming.size() >= kMostIncoming) m_incoming.pop_front();
+    m_incoming.push_back({std::move(connection), Clock::now() + kWholeTime});
+}
+
+/// False at the end of the connection.
+bool Listener::readMore(Incoming& incoming) const {
+    std::array<char, 16384> piece{};
+    const ssize_t got = ::recv(incoming.connection.number(), piece.data(), piece.size(), 0);
+    if (got < 0) return errno == EAGAIN || errno == EINTR;
+    incoming.bytes.append(piece.data(), static_cast<std::size_t>(got));
+    return got > 0;
+}
+
+/// The message if all of it is there. What can be none is answered, and its connection closed.
+std::optional<Listener::Delivered> Listener::messageIn(Incoming& incoming) const {
+    const auto refuse = [&](const char* status) {
+        send(incoming.connection.number(), status, "", "");
+        incoming.isOver = true;
+        return std::nullopt;
+    };
+    const std::string_view bytes = incoming.bytes;
+    const std::size_t end = bytes.find("\r\n\r\n");
+    if (end == std::string_view::npos)
+        return bytes.size() > kLongestHead ? refuse("431 Request Header Fields Too Large") : std::nullopt;
+    if (!bytes.starts_with("POST " + m_path + " ")) return refuse("404 Not Found");
+    const std::size_t length = lengthIn(bytes.substr(0, end));
+    if (length == 0 || length > kLongestBody) return refuse("400 Bad Request");
+    const std::string_view body = bytes.substr(end + 4);
+    if (body.size() < length) return std::nullopt;
+    return Delivered{std::move(incoming.connection), std::string(body.substr(0, length))};
+}
+
 std::optional<Listener::Delivered> Listener::next(std::chrono::milliseconds patience) {
-    if (!waitFor(m_socket.number(), patience)) return std::nullopt;
-    os::Descriptor connection(::accept4(m_socket.number(), nullptr, nullptr, SOCK_CLOEXEC));
-    if (!connection.isOpen()) return std::nullopt;
-    const Reading reading(connection.number());
-    std::string bytes;
-    std::size_t end = 0;
-    while ((end = bytes.find("\r\n\r\n")) == std::string::npos)
-        if (bytes.size() > kLongestHead || !reading.readMore(bytes)) return std::nullopt;
-    if (!bytes.starts_with("POST " + m_path + " ")) {
-        send(connection.number(), "404 Not Found", "", "");
-        return std::nullopt;
+    std::vector<pollfd> polled{{m_socket.number(), POLLIN, 0}};
+    for (const Incoming& each : m_incoming)
+        polled.push_back({each.connection.number(), POLLIN, 0});
+    if (::poll(polled.data(), polled.size(), static_cast<int>(patience.count())) < 0) return std::nullopt;
+    auto ready = polled.begin() + 1;
+    for (auto each = m_incoming.begin(); each != m_incoming.end();) {
+        const bool hasMore = (ready++)->revents != 0;
+        if ((hasMore && !readMore(*each)) || Clock::now() > each->deadline) each->isOver = true;
+        auto message = hasMore ? messageIn(*each) : std::nullopt;
+        each = each->isOver || message ? m_incoming.erase(each) : std::next(each);
+        if (message) return message;
     }
-    const std::size_t length = lengthIn(std::string_view(bytes).substr(0, end));
-    if (length == 0 || length > kLongestBody) {
-        send(connection.number(), "400 Bad Request", "", "");
-        return std::nullopt;
-    }
-    std::string body = bytes.substr(end + 4);
-    while (body.size() < length)
-        if (!reading.readMore(body)) return std::nullopt;
-    body.resize(length);
-    return Delivered{std::move(connection), std::move(body)};
+    if (polled.front().revents != 0) accept();
+    return std::nullopt;
 }
 
 void Listener::answer(const Delivered& delivered, const std::string& body) {

@@ -3,6 +3,7 @@
 
 #include <chrono>
 #include <cstdint>
+#include <list>
 #include <optional>
 #include <string>
 
@@ -10,7 +11,8 @@
 
 namespace cli {
 
-/// A port on which a server delivers indications, one connection after the other. Used from one thread.
+/// A port on which a server delivers indications, one on each connection. Connections on which nothing comes
+/// hold up nobody. Used from one thread.
 class Listener {
   public:
     /// @param address  of this machine
@@ -34,10 +36,22 @@ class Listener {
     static void answer(const Delivered& delivered, const std::string& body);
 
   private:
+    /// A connection on which a message is coming.
+    struct Incoming {
+        os::Descriptor connection;
+        std::chrono::steady_clock::time_point deadline;
+        std::string bytes = {};
+        bool isOver = false;
+    };
+    void accept();
+    bool readMore(Incoming& incoming) const;
+    std::optional<Delivered> messageIn(Incoming& incoming) const;
+
     os::Descriptor m_socket;
     std::string m_address;
     std::string m_path;
     std::uint16_t m_port = 0;
+    std::list<Incoming> m_incoming;  ///< the oldest first
 };
 
 }  // namespace cli
