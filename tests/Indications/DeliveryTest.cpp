@@ -74,7 +74,7 @@ DeliveryCounters settled(const Delivery& delivery, const std::string& destinatio
 }
 
 TEST(DeliveryTest, BringsEverythingInItsOrder) {
-    constexpr std::size_t kMany = 2'000;
+    constexpr std::size_t kMany = 10'000;
     DeliverySettings settings = quick();
     settings.mostWaiting = kMany;
     StrictListener listener;

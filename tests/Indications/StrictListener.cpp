@@ -160,7 +160,7 @@ StrictListener::~StrictListener() {
     }
     ::shutdown(m_socket, SHUT_RDWR);
     m_accepting.join();
-    m_threads.clear();
+    m_serving.clear();
     ::close(m_socket);
     if (m_credentials != nullptr) ::gnutls_certificate_free_credentials(m_credentials);
 }
@@ -169,7 +169,10 @@ void StrictListener::accept() {
     while (true) {
         const int connection = ::accept4(m_socket, nullptr, nullptr, SOCK_CLOEXEC);
         if (connection < 0) return;
-        m_threads.emplace_back([this, connection] { serve(connection); });
+        std::erase_if(m_serving, [](const std::future<void>& each) {
+            return each.wait_for(std::chrono::seconds(0)) == std::future_status::ready;
+        });
+        m_serving.push_back(std::async(std::launch::async, [this, connection] { serve(connection); }));
     }
 }
 

@@ -5,6 +5,7 @@
 
 #include <condition_variable>
 #include <functional>
+#include <future>
 #include <mutex>
 #include <string>
 #include <thread>
@@ -62,7 +63,7 @@ class StrictListener {
     std::vector<std::string> m_bodies;
     std::vector<std::string> m_problems;
     bool m_isEnding = false;
-    std::vector<std::jthread> m_threads;  ///< the accepting one's own
+    std::vector<std::future<void>> m_serving;  ///< the accepting thread's own
     std::jthread m_accepting;
 };
 
