@@ -39,6 +39,9 @@ enumeration_seconds = 4
 [providers]
 directory = "{build}/lib"
 configuration = "{folder}/provider.conf"
+[indications]
+file = "{folder}/subscriptions.json"
+per_second = 0
 [adapters]
 description = "{folder}/adapters.toml"
 state = "{folder}/state"
