@@ -8,6 +8,7 @@
 
 #include "History/Keeper.h"
 #include "History/Look.h"
+#include "History/Owner.h"
 #include "History/Place.h"
 #include "History/Writer.h"
 #include "MidAPI/Image/OptionRom.h"
@@ -47,14 +48,13 @@ std::string joinedNames(const std::vector<utils::FirmwareType>& types) {
 
 Record recordOf(const core::UpdateAttempt& attempt) {
     const core::Caller& caller = attempt.caller;
-    const ThisProcess process = describeThisProcess();
     Record record;
     record.begun = static_cast<std::int64_t>(attempt.time);
     record.user = caller.principal.empty() ? std::to_string(::getuid()) : caller.principal;
     record.address = caller.address;
     record.front = caller.front;
     record.process = ::getpid();
-    record.boot = process.boot;
+    record.boot = bootId();
     record.host = os::getHostname();
     record.target = cut(attempt.target);
     record.adapter = attempt.adapter;

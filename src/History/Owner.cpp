@@ -30,13 +30,6 @@ std::string asTheKernelWritesIt(std::string id) {
     return id;
 }
 
-/// A service that sees only processes of /proc is told the boot's id by its manager.
-std::string bootId() {
-    const std::string id = systemText("/proc/sys/kernel/random/boot_id");
-    const char* told = os::getEnvVariable("QUENX_BOOT_ID");
-    return id.empty() && told != nullptr ? asTheKernelWritesIt(told) : id;
-}
-
 /// The 22nd field of the line; the second one, the name, may hold blanks and parentheses.
 std::string startTime() {
     constexpr int kFieldsAfterName = 20;
@@ -56,8 +49,14 @@ std::string uniqueName() {
 
 }  // namespace
 
-ThisProcess describeThisProcess() {
-    return {systemText("/proc/self/comm"), startTime(), bootId()};
+const std::string& bootId() {
+    // Read once: it outlives every process.
+    static const std::string kId = [] {
+        const std::string id = systemText("/proc/sys/kernel/random/boot_id");
+        const char* told = os::getEnvVariable("QUENX_BOOT_ID");
+        return id.empty() && told != nullptr ? asTheKernelWritesIt(told) : id;
+    }();
+    return kId;
 }
 
 Owner::Owner(const std::string& folder)

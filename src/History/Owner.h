@@ -8,13 +8,9 @@
 
 namespace history {
 
-/// This process, as its records name it.
-struct ThisProcess {
-    std::string program;    ///< "quenxctl"
-    std::string startTime;  ///< in ticks since the machine's start; empty when it cannot be had
-    std::string boot;       ///< the id of that start; likewise
-};
-ThisProcess describeThisProcess();
+/// The id of this start of the machine; empty when it cannot be had. A service that sees only processes of
+/// /proc is told by its manager, in QUENX_BOOT_ID.
+const std::string& bootId();
 
 /// Says in a history's folder that this process lives: a file that it keeps locked. The kernel drops the lock
 /// when the process dies, whatever its number is then given to. Made, and looked at by others, under the
