@@ -4,6 +4,10 @@
 #include <dlfcn.h>
 #include <gtest/gtest.h>
 #include <netdb.h>
+#include <netinet/in.h>
+#include <poll.h>
+#include <sys/socket.h>
+#include <unistd.h>
 
 #include <atomic>
 #include <cstdlib>
@@ -32,6 +36,10 @@ extern "C" [[gnu::visibility("default")]] int getaddrinfo(const char* name, cons
     if (name != nullptr && std::string_view(name).ends_with(".slow.example")) {
         g_nameServerAnswers.wait(false);
         return EAI_AGAIN;
+    }
+    if (name != nullptr && std::string_view(name).ends_with(".dual.example")) {
+        const int error = ::getaddrinfo("127.0.0.1", service, hints, found);
+        return error == 0 ? ::getaddrinfo("::1", service, nullptr, &(*found)->ai_next) : error;
     }
     static const auto real = reinterpret_cast<decltype(&::getaddrinfo)>(::dlsym(RTLD_NEXT, "getaddrinfo"));
     return real(name, service, hints, found);
@@ -215,6 +223,51 @@ TEST(DeliveryTest, IsNotHeldUpByANameServerThatDoesNotAnswer) {
     g_nameServerAnswers.notify_all();
     EXPECT_TRUE(isInTime);
     EXPECT_TRUE(reached.get());
+}
+
+TEST(DeliveryTest, TriesAgainWhereOneOfTwoAddressesIsAllowed) {
+    const int socket = ::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0);
+    sockaddr_in place{};
+    place.sin_family = AF_INET;
+    place.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
+    socklen_t size = sizeof place;
+    ASSERT_EQ(::bind(socket, reinterpret_cast<sockaddr*>(&place), size), 0);
+    ASSERT_EQ(::getsockname(socket, reinterpret_cast<sockaddr*>(&place), &size), 0);
+    DeliverySettings settings = quick();
+    settings.retries = 10'000;
+    {
+        Delivery delivery(settings);
+        const auto onlyIpv4 =
+            indications::AddressPolicy::onlyTo(std::vector{indications::networkIn("127.0.0.1").value()});
+        delivery.add("d", "http://listener.dual.example:" + std::to_string(ntohs(place.sin_port)), onlyIpv4,
+                     "c");
+        delivery.send("d", 1, numbered);
+        utils::Thread::msleep(100);
+        // As a listener that starts anew; before, it refuses connections, and the other address is denied.
+        ASSERT_EQ(::listen(socket, 1), 0);
+        pollfd waiting{socket, POLLIN, 0};
+        EXPECT_EQ(::poll(&waiting, 1, 30'000), 1);
+        EXPECT_EQ(delivery.counters("d").givenUp, 0U);
+    }
+    ::close(socket);
+}
+
+TEST(DeliveryTest, KeepsTheBoundsOnBytes) {
+    StrictListener hanging([](std::size_t) { return Step{Answer::Never, 200}; });
+    DeliverySettings settings = quick();
+    settings.mostBytes = 1'000;
+    settings.mostBytesOfAll = 1'500;
+    Delivery delivery(settings);
+    const auto large = [](const auto&) { return std::string(100, 'x'); };
+    for (const char* name : {"a", "b"}) {
+        delivery.add(name, hanging.url(), toLoopback(), name);
+        for (int i = 0; i < 20; ++i)
+            delivery.send(name, 1, large);
+    }
+    // The first one had all it may have before the other one came.
+    EXPECT_EQ(delivery.counters("a").waiting + delivery.counters("b").waiting, 15U);
+    EXPECT_EQ(delivery.counters("a").overflow + delivery.counters("b").overflow, 25U);
+    EXPECT_LE(delivery.counters("b").waiting, 10U);
 }
 
 TEST(DeliveryTest, ConnectsToNoAddressThatThePolicyForbids) {

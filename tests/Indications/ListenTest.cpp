@@ -79,6 +79,7 @@ TEST(ListenTest, SaysWhenItHearsNothing) {
     EXPECT_EQ(client.remove(test::SubscriptionClient::xmlOf(names.result().first_child())).error, 0);
     const ProgramResult result = listening.program().finish();
     EXPECT_THAT(result.error, HasSubstr("The server has this subscription no more."));
+    EXPECT_EQ(client.count("CIM_IndicationFilter"), 6U);
     EXPECT_EQ(result.status, 1);
 }
 

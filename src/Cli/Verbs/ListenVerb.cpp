@@ -87,7 +87,7 @@ class OwnSubscription {
         return m_operations.getInstance(m_made.back(), wanted).number(wanted.front()) != kDegraded;
     } catch (const core::CimError& error) {
         if (error.status() != core::CimStatus::NotFound) throw;
-        m_made.clear();
+        m_made.pop_back();  // the others are still there
         throw CommandError(
             ExitStatus::Failed, "The server has this subscription no more.",
             "An administrator has deleted it, or the server has begun anew without it. Listen again.");

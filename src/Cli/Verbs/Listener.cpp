@@ -2,9 +2,11 @@
 #include "Cli/Verbs/Listener.h"
 
 #include <netdb.h>
+#include <netinet/in.h>
 #include <poll.h>
 #include <sys/socket.h>
 
+#include <algorithm>
 #include <array>
 #include <cerrno>
 #include <cstring>
@@ -25,6 +27,12 @@ constexpr std::size_t kLongestBody = 4 << 20;
 constexpr std::chrono::seconds kWholeTime{10};  ///< for one message
 constexpr std::size_t kMostIncoming = 16;
 
+bool isUnspecified(const sockaddr& address) {
+    if (address.sa_family == AF_INET)
+        return reinterpret_cast<const sockaddr_in&>(address).sin_addr.s_addr == INADDR_ANY;
+    return IN6_IS_ADDR_UNSPECIFIED(&reinterpret_cast<const sockaddr_in6&>(address).sin6_addr);
+}
+
 /// Numbers only: which of a name's addresses would be listened on is nothing to guess.
 std::unique_ptr<addrinfo, decltype(&::freeaddrinfo)> placeOf(const std::string& address, std::uint16_t port) {
     addrinfo hints{};
@@ -33,6 +41,12 @@ std::unique_ptr<addrinfo, decltype(&::freeaddrinfo)> placeOf(const std::string& 
     addrinfo* found = nullptr;
     if (::getaddrinfo(address.c_str(), std::to_string(port).c_str(), &hints, &found) != 0) {
         throw CommandError(ExitStatus::WrongUse, "--address is \"" + address + "\", which is no address.",
+                           "Name one of this machine, as 192.0.2.7 or 2001:db8::7.");
+    }
+    if (isUnspecified(*found->ai_addr)) {
+        ::freeaddrinfo(found);
+        throw CommandError(ExitStatus::WrongUse,
+                           "--address is \"" + address + "\", which no server can reach.",
                            "Name one of this machine, as 192.0.2.7 or 2001:db8::7.");
     }
     return {found, ::freeaddrinfo};
@@ -96,8 +110,11 @@ std::string Listener::url() const {
 void Listener::accept() {
     os::Descriptor connection(::accept4(m_socket.number(), nullptr, nullptr, SOCK_CLOEXEC | SOCK_NONBLOCK));
     if (!connection.isOpen()) return;
-    // A server sends one at a time: many at once are somebody else's.
-    if (m_incoming.size() >= kMostIncoming) m_incoming.pop_front();
+    // A server sends one at a time, and at once: those on which nothing has come are somebody else's.
+    if (m_incoming.size() >= kMostIncoming) {
+        const auto silent = std::ranges::find_if(m_incoming, [](auto& each) { return each.bytes.empty(); });
+        m_incoming.erase(silent == m_incoming.end() ? m_incoming.begin() : silent);
+    }
     m_incoming.push_back({std::move(connection), Clock::now() + kWholeTime});
 }
 

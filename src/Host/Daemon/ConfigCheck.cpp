@@ -145,7 +145,14 @@ void checkUploads(const UploadSettings& settings) try {
 void checkSubscriptionsFile(const std::string& file) {
     const bool isSet = file != IndicationSettings{}.file;
     if (file.empty() || (!isSet && !fs::exists(file))) return;
-    requireWritable(file, "Set indications.file to another file, or to \"\".");
+    const std::string advice = "Set indications.file to another file, or to \"\".";
+    if (fs::exists(file) && !fs::is_regular_file(file))
+        throw std::runtime_error("indications.file is " + file + ", which is no file. " + advice);
+    requireWritable(file, advice);
+    // The one that it is in is made where it is missing.
+    const fs::path above = fs::absolute(file).parent_path().parent_path();
+    if (!fs::is_directory(above))
+        throw std::runtime_error("There is no directory " + above.string() + ". Make it. " + advice);
 }
 
 }  // namespace

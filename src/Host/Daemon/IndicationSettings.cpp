@@ -29,12 +29,18 @@ indications::DestinationRule ruleOf(const std::vector<std::string>& destinations
     return rule;
 }
 
+std::optional<std::string> contentOf(const std::string& file, const std::string& advice) try {
+    return os::readTextFile(file);
+} catch (const os::UnusableFile& error) {
+    throw std::runtime_error(file + " " + error.what() + "." + advice);
+}
+
 /// libcurl would tell of it with each indication, and nobody would hear any.
 void requireCertificates(const std::string& file) {
     if (file.empty()) return;
     const std::string advice =
         " Check indications.certificates, or set it to \"\" for the system's authorities.";
-    auto text = os::readTextFile(file);
+    auto text = contentOf(file, advice);
     if (!text)
         throw std::runtime_error("indications.certificates is " + file + ", which does not exist." + advice);
     const gnutls_datum_t bytes{reinterpret_cast<unsigned char*>(text->data()),

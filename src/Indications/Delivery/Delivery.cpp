@@ -17,8 +17,8 @@ namespace indications {
 namespace {
 
 constexpr std::size_t kMostTransfers = 16;
-/// To those that have failed, which may each take all the time there is.
-constexpr std::size_t kMostToFailing = 8;
+/// To those that have not taken the last one, or none yet: each may take all the time there is.
+constexpr std::size_t kMostToUnproven = 8;
 
 using Multi = std::unique_ptr<CURLM, decltype(&::curl_multi_cleanup)>;
 
@@ -90,7 +90,7 @@ class Delivery::Courier : public utils::Thread {
         std::string destination;
         std::shared_ptr<Target> target;  ///< which may have been removed meanwhile
         std::unique_ptr<Transfer> transfer;
-        bool toFailing = false;
+        bool toUnproven = false;
     };
 
     void wake() noexcept { ::curl_multi_wakeup(m_multi.get()); }
@@ -127,15 +127,15 @@ void Delivery::Courier::makeRoom() {
 }
 
 bool Delivery::Courier::begin(const std::string& destination, const std::shared_ptr<Target>& target) {
-    const bool toFailing = target->queue.counters().isFailing;
-    const auto failing = std::ranges::count_if(m_underWay, [](const auto& each) { return each.toFailing; });
-    if (toFailing && static_cast<std::size_t>(failing) >= kMostToFailing) return false;
+    const bool isUnproven = !target->queue.isReliable();
+    const auto unproven = std::ranges::count_if(m_underWay, [](const auto& each) { return each.toUnproven; });
+    if (isUnproven && static_cast<std::size_t>(unproven) >= kMostToUnproven) return false;
     if (m_pace.next(target->address) > Clock::now()) return false;
     const Message* const message = target->queue.begin(Clock::now());
     if (message == nullptr) return false;
     try {
         auto transfer = std::make_unique<Transfer>(target->url, target->policy, message->body, m_settings);
-        m_underWay.push_back({destination, target, std::move(transfer), toFailing});
+        m_underWay.push_back({destination, target, std::move(transfer), isUnproven});
         if (::curl_multi_add_handle(m_multi.get(), m_underWay.back().transfer->handle()) == CURLM_OK)
             return true;
         m_underWay.pop_back();

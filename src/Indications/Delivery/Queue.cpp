@@ -53,6 +53,7 @@ const Message* Queue::begin(Clock::time_point now) {
 
 void Queue::end(Outcome outcome, const DeliverySettings& settings, Clock::time_point now) {
     m_isUnderWay = false;
+    m_isReliable = outcome == Outcome::Taken;
     if (outcome == Outcome::Taken) {
         ++m_counters.delivered;
         m_counters.isFailing = false;

@@ -75,6 +75,8 @@ class Queue {
     /// When to ask for the next again; nothing where there is none, or one is under way.
     std::optional<Clock::time_point> due() const;
     std::size_t bytes() const { return m_bytes; }
+    /// Whether the last try was taken.
+    bool isReliable() const { return m_isReliable; }
     /// Drops the oldest that is not under way; false where there is none.
     bool dropOldest();
     DeliveryCounters counters() const;
@@ -88,6 +90,7 @@ class Queue {
     std::deque<Message> m_messages;
     std::size_t m_bytes = 0;
     bool m_isUnderWay = false;
+    bool m_isReliable = false;
     Clock::time_point m_notBefore{};
     Clock::time_point m_failingSince{};
     DeliveryCounters m_counters;

@@ -85,8 +85,11 @@ void Transfer::setLimits(const DeliverySettings& settings) {
 
 curl_socket_t Transfer::openSocket(void* transfer, curlsocktype, curl_sockaddr* address) noexcept {
     auto& self = *static_cast<Transfer*>(transfer);
-    self.m_isDenied = !self.m_policy.allows(address->addr);
-    if (self.m_isDenied) return CURL_SOCKET_BAD;
+    if (!self.m_policy.allows(address->addr)) {
+        self.m_isDenied = true;
+        return CURL_SOCKET_BAD;
+    }
+    self.m_isAllowed = true;
     return ::socket(address->family, address->socktype | SOCK_CLOEXEC, address->protocol);
 }
 
@@ -102,7 +105,8 @@ std::size_t Transfer::takeAnswer(char* bytes, std::size_t size, std::size_t coun
 }
 
 Transfer::Result Transfer::result(CURLcode code) const {
-    if (m_isDenied && code != CURLE_OK)
+    // One of several addresses may be denied, and the one that is not may be back for another try.
+    if (m_isDenied && !m_isAllowed && code != CURLE_OK)
         return {Outcome::Refused, "indications.destinations does not allow its address"};
     if (code != CURLE_OK && !m_isTooLong) {
         const bool isExplained = m_error.front() != '\0';

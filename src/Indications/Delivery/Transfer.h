@@ -45,7 +45,8 @@ class Transfer {
     const AddressPolicy m_policy;
     const std::string m_body;
     std::string m_answer;
-    bool m_isDenied = false;   ///< the address, by the policy
+    bool m_isAllowed = false;  ///< an address of the name
+    bool m_isDenied = false;   ///< another one, or the same   ///< the address, by the policy
     bool m_isTooLong = false;  ///< the answer
     std::array<char, CURL_ERROR_SIZE> m_error{};
     std::unique_ptr<CURL, decltype(&::curl_easy_cleanup)> m_curl;

@@ -122,10 +122,14 @@ std::vector<DestinationKey> Broadcast::abandoned() const {
 }
 
 void Broadcast::run(const std::stop_token& stop) {
-    while (const auto event = m_events->next(stop)) {
+    constexpr std::chrono::milliseconds kLook = std::chrono::minutes(1);
+    const auto none = std::chrono::milliseconds::zero();
+    const auto patience = m_settings.abandonTime == none ? kLook : std::min(kLook, m_settings.abandonTime);
+    while (!stop.stop_requested()) {
         try {
-            tell(*event);
+            const auto event = m_events->next(stop, patience);
             if (!abandoned().empty()) m_clearing();
+            if (event) tell(*event);
         } catch (const std::exception& error) {
             QUENX_ERROR("An event could not be told: %s", error.what());
         }

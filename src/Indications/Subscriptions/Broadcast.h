@@ -28,7 +28,7 @@ class Broadcast {
   public:
     /// To where messages for a destination may go.
     using Policy = std::function<AddressPolicy(const Destination&)>;
-    /// Called by the thread when a destination has been abandoned.
+    /// Called by the thread when a destination has been abandoned, at most a minute later.
     using Clearing = std::function<void()>;
 
     /// @param implementation  knows the classes of instances; used until the end

@@ -16,9 +16,10 @@ void EventQueue::take(const core::InstanceEvent& event) noexcept {
     m_arrived.notify_one();
 }
 
-std::optional<core::InstanceEvent> EventQueue::next(const std::stop_token& stop) {
+std::optional<core::InstanceEvent> EventQueue::next(const std::stop_token& stop,
+                                                    std::chrono::milliseconds patience) {
     std::unique_lock lock(m_mutex);
-    if (!m_arrived.wait(lock, stop, [&] { return !m_events.empty(); })) return std::nullopt;
+    if (!m_arrived.wait_for(lock, stop, patience, [&] { return !m_events.empty(); })) return std::nullopt;
     core::InstanceEvent event = std::move(m_events.front());
     m_events.pop_front();
     return event;

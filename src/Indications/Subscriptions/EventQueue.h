@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include <chrono>
 #include <condition_variable>
 #include <cstddef>
 #include <deque>
@@ -21,8 +22,8 @@ class EventQueue : public core::EventSink {
 
     void take(const core::InstanceEvent& event) noexcept override;
 
-    /// The oldest, as soon as there is one; nothing when stop is requested.
-    std::optional<core::InstanceEvent> next(const std::stop_token& stop);
+    /// The oldest, as soon as there is one; nothing when there was none for so long, or stop is requested.
+    std::optional<core::InstanceEvent> next(const std::stop_token& stop, std::chrono::milliseconds patience);
 
   private:
     std::mutex m_mutex;

@@ -44,6 +44,10 @@ constexpr StaticQuery kStaticQueries[] = {
 
 }  // namespace
 
+std::size_t Records::clientFilters() const {
+    return static_cast<std::size_t>(std::ranges::count(filters, false, &Filter::isStatic));
+}
+
 const Filter* Records::filter(const std::string& name) const {
     return find(filters, [&](const Filter& each) { return each.name == name; });
 }
@@ -59,9 +63,20 @@ const Subscription* Records::subscription(const std::string& filter,
     });
 }
 
-void Records::erase(const DestinationKey& destination) {
-    std::erase_if(subscriptions, [&](const Subscription& each) { return each.destination == destination; });
-    std::erase_if(destinations, [&](const Destination& each) { return each.key == destination; });
+void Records::erase(const DestinationKey& key) {
+    const Destination* const gone = destination(key);
+    if (gone == nullptr) return;
+    std::erase_if(filters, [&](const Filter& filter) {
+        if (filter.isStatic || filter.creator != gone->creator) return false;
+        const auto refersTo = [&](const Subscription& each) { return each.filter == filter.name; };
+        const auto isElsewhere = [&](const Subscription& each) {
+            return refersTo(each) && each.destination != key;
+        };
+        return std::ranges::any_of(subscriptions, refersTo) &&
+               std::ranges::none_of(subscriptions, isElsewhere);
+    });
+    std::erase_if(subscriptions, [&](const Subscription& each) { return each.destination == key; });
+    std::erase_if(destinations, [&](const Destination& each) { return each.key == key; });
 }
 
 std::vector<Filter> staticFilters(const std::string& namespaceName) {

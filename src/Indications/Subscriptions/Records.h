@@ -82,13 +82,16 @@ struct Records {
     std::vector<Destination> destinations;
     std::vector<Subscription> subscriptions;
 
+    /// How many filters are none of the server's own.
+    std::size_t clientFilters() const;
+
     // Null where there is none.
     const Filter* filter(const std::string& name) const;
     const Destination* destination(const DestinationKey& key) const;
     const Subscription* subscription(const std::string& filter, const DestinationKey& destination) const;
 
-    /// With the subscriptions that refer to it.
-    void erase(const DestinationKey& destination);
+    /// With the subscriptions that refer to it, and the filters of its creator to which these alone refer.
+    void erase(const DestinationKey& key);
 };
 
 /// The filters that the server itself has for jobs, not compiled yet.

@@ -205,7 +205,7 @@ void StateFile::write(const Records& records) {
     } catch (const core::CimError&) {
         throw;
     } catch (const std::exception& error) {
-        QUENX_ERROR("A subscription was refused, since it could not be kept: %s", error.what());
+        QUENX_ERROR("A change of the subscriptions could not be kept: %s", error.what());
         throw core::CimError(core::CimStatus::Failed,
                              std::string("the change could not be kept: ") + error.what());
     }

@@ -139,7 +139,7 @@ bool Subscriptions::accept(Records& all, Records kept) {
     const EventSources known = sources();
     for (Filter& filter : kept.filters) {
         take("Filter " + filter.name, [&] {
-            requireRoom(all.filters.size(), 2 * m_settings.most, "filters");
+            requireRoom(all.clientFilters(), 2 * m_settings.most, "filters");
             if (all.filter(filter.name) != nullptr) refuseSecond(pathOf(filter, m_systemName));
             try {
                 check(filter, known);
@@ -262,19 +262,23 @@ Records Subscriptions::changeable() const {
     Records copy = *records();
     const std::uint64_t now = currentTime();
     std::erase_if(copy.subscriptions, [&](const Subscription& each) { return each.isExpired(now); });
-    for (const DestinationKey& each : m_broadcast.abandoned()) {
-        QUENX_ERROR(
-            "The destination '%s' and its subscriptions are removed: it has taken nothing for too long",
-            utils::escapeForFormat(each.text()).c_str());
-        copy.erase(each);
-    }
     return copy;
 }
 
 /// Of clients that have gone without a word nothing stays for ever.
 void Subscriptions::clear() noexcept try {
     const std::lock_guard changing(m_changes);
-    publish(changeable());
+    const auto gone = m_broadcast.abandoned();
+    if (gone.empty()) return;  // a client has been quicker
+    Records changed = changeable();
+    for (const DestinationKey& each : gone)
+        changed.erase(each);
+    publish(std::move(changed));
+    for (const DestinationKey& each : gone) {
+        QUENX_ERROR(
+            "The destination '%s' was removed with its subscriptions: it has taken nothing for too long",
+            utils::escapeForFormat(each.text()).c_str());
+    }
 } catch (const std::exception& error) {
     QUENX_ERROR("Subscriptions of clients that have gone could not be removed: %s", error.what());
 }
@@ -298,7 +302,7 @@ CimPath Subscriptions::createFilter(Records& records, const InstanceValue& insta
     filter.creator = core::CallerScope::current().principal;
     CimPath path = pathOf(filter, m_systemName);
     if (records.filter(filter.name) != nullptr) refuseSecond(path);
-    requireRoom(records.filters.size(), 2 * m_settings.most, "filters");
+    requireRoom(records.clientFilters(), 2 * m_settings.most, "filters");
     check(filter, sources());
     records.filters.push_back(std::move(filter));
     return path;
