@@ -44,6 +44,12 @@ void Database::execute(const std::string& sql) {
     require(sqlite3_exec(m_database.get(), sql.c_str(), nullptr, nullptr, nullptr), m_database.get());
 }
 
+void Database::syncEachChange(bool wanted) {
+    if (wanted == m_syncsEachChange) return;
+    execute(wanted ? "PRAGMA synchronous = FULL" : "PRAGMA synchronous = NORMAL");
+    m_syncsEachChange = wanted;
+}
+
 std::int64_t Database::number(const std::string& sql) {
     Statement statement(*this, sql);
     return statement.step() ? statement.number(0).value_or(0) : 0;

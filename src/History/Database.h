@@ -31,6 +31,10 @@ class Database {
     explicit Database(const std::string& path);
 
     void execute(const std::string& sql);
+    /// Whether each change is on the medium when it ends, as it is at first, or only soon after: the power
+    /// may take it then, but the death of this process does not, and either all of it is there or nothing.
+    /// The next change that is on the medium brings those before it there.
+    void syncEachChange(bool wanted);
     /// The first column of the first row; 0 without one.
     std::int64_t number(const std::string& sql);
     std::string text(const std::string& sql);
@@ -52,6 +56,7 @@ class Database {
     void giveBack(const std::string& sql, Prepared statement) noexcept;
 
     std::unique_ptr<sqlite3, Close> m_database;
+    bool m_syncsEachChange = true;
     /// Those that nobody uses, by their texts: to read a text takes longer than to carry it out. SQLite reads
     /// one again by itself when the schema has changed.
     std::map<std::string, Prepared> m_idle;

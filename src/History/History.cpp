@@ -82,6 +82,11 @@ void finish(Record& record, std::uint64_t since) {
 struct History::Process {
     explicit Process(const Settings& settings)
         : keeper(std::make_shared<Keeper>(settings)), writer([held = keeper] { return held->watch(); }) {}
+    Process(const Process&) = delete;
+    Process& operator=(const Process&) = delete;
+    ~Process() {
+        writer.run([held = keeper] { held->sync(); }, {});
+    }
 
     const pid_t id = ::getpid();
     const std::shared_ptr<Keeper> keeper;
@@ -185,8 +190,8 @@ void History::refused(const core::UpdateAttempt& attempt, unsigned int returnVal
     if (returnValue != 0) record.returnValue = returnValue;
     finish(record, attempt.monotonic);
     Process& own = process();
-    own.writer.run([keeper = own.keeper, record, most = attempt.mostRecords] { keeper->add(record, most); },
-                   kPatience);
+    own.keeper->refused(std::move(record), attempt.mostRecords);
+    own.writer.run([keeper = own.keeper] { keeper->addRefused(); }, kPatience);
 } catch (const std::exception&) {
     // Without memory there is no record; the other reason has been told.
 }

@@ -3,6 +3,8 @@
 
 #include <algorithm>
 #include <filesystem>
+#include <map>
+#include <utility>
 
 #include "Framework/Requests/Audit.h"
 #include "Framework/Requests/Reasons.h"
@@ -19,6 +21,8 @@ namespace {
 
 // Updates wait for less; a record that comes late is better than none.
 constexpr std::chrono::seconds kLockPatience{30};
+
+constexpr std::size_t kMostRefused = 1000;  // while the disk does not answer
 
 std::int64_t now() {
     return static_cast<std::int64_t>(os::getuSecondsSinceEpoch());
@@ -58,13 +62,18 @@ void Keeper::say(const std::string& problem) {
     utils::writeAuditLog("[history] No record is kept of updates: " + utils::escapeForLog(problem, 400));
 }
 
-bool Keeper::withStore(const std::function<void(Store&)>& step) noexcept try {
+bool Keeper::withStore(const std::function<void(Store&)>& step, bool isSyncedLater) noexcept try {
+    const auto attempt = [&] {
+        Store& store = open();
+        store.syncLater(isSyncedLater);
+        step(store);
+    };
     try {
-        step(open());
+        attempt();
     } catch (const DatabaseError& error) {
         if (!error.isDamage()) throw;
         replaceDamaged(error.what());
-        step(open());
+        attempt();
     }
     m_problem.clear();
     return true;
@@ -123,23 +132,49 @@ void Keeper::replaceDamaged(const std::string& reason) {
                          ". A new one begins.");
 }
 
-void Keeper::insert(Store& store, Record& record, std::int64_t most) {
-    record.owner = m_owner->name();
-    const Store::Pruned pruned = store.add(record, most);
+void Keeper::insert(Store& store, std::span<Record> records, std::int64_t most) {
+    for (Record& record : records)
+        record.owner = m_owner->name();
+    const Store::Pruned pruned = store.add(records, most);
     if (pruned.last != 0)
         core::audit(
-            {{.principal = record.front, .address = "local"},
+            {{.principal = records.front().front, .address = "local"},
              "PruneHistory",
              m_folder,
              "removed records " + std::to_string(pruned.first) + " to " + std::to_string(pruned.last)});
 }
 
-void Keeper::add(Record record, std::int64_t most) {
-    if (const auto look = record.adapter.empty() ? std::nullopt : lookAt(record.adapter)) {
-        identify(record, *look);
-        record.versionsBefore = look->running;
+void Keeper::refused(Record record, std::int64_t most) {
+    const utils::Mutex::AutoLocker lock(m_refusedMutex);
+    m_mostRecords = most;
+    if (m_refused.size() < kMostRefused) m_refused.push_back(std::move(record));
+}
+
+void Keeper::addRefused() {
+    std::vector<Record> records;
+    std::int64_t most = 0;
+    {
+        const utils::Mutex::AutoLocker lock(m_refusedMutex);
+        records.swap(m_refused);
+        most = m_mostRecords;
     }
-    withStore([&](Store& store) { insert(store, record, most); });
+    if (records.empty()) return;  // written with those of others
+    std::map<std::string, std::optional<AdapterLook>> looks;
+    for (Record& record : records) {
+        if (record.adapter.empty()) continue;
+        const auto [known, isNew] = looks.try_emplace(record.adapter);
+        if (isNew) known->second = lookAt(record.adapter);
+        if (!known->second) continue;
+        identify(record, *known->second);
+        record.versionsBefore = known->second->running;
+    }
+    // Anybody who may ask can be refused as often as he likes: none of that may keep the disk busy, and with
+    // it the updates of others.
+    m_isUnsynced |= withStore([&](Store& store) { insert(store, records, most); }, true);
+}
+
+void Keeper::sync() {
+    if (std::exchange(m_isUnsynced, false)) prove();
 }
 
 bool Keeper::begin(const std::shared_ptr<RunningUpdate>& update) {
@@ -152,7 +187,7 @@ bool Keeper::begin(const std::shared_ptr<RunningUpdate>& update) {
     m_running.push_back(update);
     return withStore([&](Store& store) {
         completeOfDead(store);
-        insert(store, record, update->most);
+        insert(store, {&record, 1}, update->most);
     });
 }
 
@@ -169,7 +204,7 @@ void Keeper::end(const std::shared_ptr<RunningUpdate>& update) {
         record.active = record.ended;
     withStore([&](Store& store) {
         if (record.id == 0)
-            insert(store, record, update->most);  // the disk may have been full at the beginning
+            insert(store, {&record, 1}, update->most);  // the disk may have been full at the beginning
         else
             store.update(record);
     });
@@ -192,6 +227,8 @@ std::string Keeper::prove() noexcept {
 }
 
 bool Keeper::watch() {
+    const bool hasSynced = m_isUnsynced;
+    sync();
     for (const auto& update : m_running) {
         std::int64_t percent = 0;
         try {
@@ -204,7 +241,7 @@ bool Keeper::watch() {
         record.percent = percent;
         withStore([&](Store& store) { store.setProgress(record.id, percent); });
     }
-    return !m_running.empty();
+    return hasSynced || !m_running.empty();
 }
 
 void Keeper::completeOfDead(Store& store) const {

@@ -152,7 +152,7 @@ void Store::prepare() {
                            "; this one knows " + std::to_string(kSchema) +
                            "). Use that version, or move the file away.");
     // Where the file system cannot share memory SQLite stays with its older journal, which is as safe.
-    m_database.text("PRAGMA journal_mode = WAL");
+    m_isLogged = m_database.text("PRAGMA journal_mode = WAL") == "wal";
     if (version == kSchema) return;
     Transaction transaction(m_database);
     m_database.execute(tableSql() + "PRAGMA user_version = " + std::to_string(kSchema));
@@ -177,13 +177,15 @@ void Store::prove() {
     transaction.commit();
 }
 
-Store::Pruned Store::add(Record& record, std::int64_t most) {
+Store::Pruned Store::add(std::span<Record> records, std::int64_t most) {
     Transaction transaction(m_database);
     static const std::string kSql = insertSql();
-    Statement insert(m_database, kSql);
-    bindColumns(insert, record);
-    insert.step();
-    record.id = m_database.lastId();
+    for (Record& record : records) {
+        Statement insert(m_database, kSql);
+        bindColumns(insert, record);
+        insert.step();
+        record.id = m_database.lastId();
+    }
     const Pruned pruned = prune(most);
     transaction.commit();
     return pruned;

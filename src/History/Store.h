@@ -4,6 +4,7 @@
 #include <sys/types.h>
 
 #include <cstdint>
+#include <span>
 #include <stdexcept>
 #include <string>
 #include <variant>
@@ -42,10 +43,13 @@ class Store {
 
     /// Writes to the medium, and changes nothing.
     void prove();
+    /// Whether what is changed from now on need not be on the medium when the change ends: see
+    /// Database::syncEachChange().
+    void syncLater(bool wanted) { m_database.syncEachChange(!wanted || !m_isLogged); }
 
-    /// Adds the record, and gives it its id.
+    /// Adds the records, all or none, and gives them their ids.
     /// @param most  how many records are kept
-    Pruned add(Record& record, std::int64_t most);
+    Pruned add(std::span<Record> records, std::int64_t most);
     /// Puts what is known now in the place of a record of the same owner, unless its update has ended.
     void update(const Record& record);
     /// Takes away the record of an update that did not begin after all.
@@ -73,6 +77,7 @@ class Store {
     dev_t m_device = 0;
     ino_t m_inode = 0;
     Database m_database;
+    bool m_isLogged = false;  ///< with the older journal a change that is not synced could spoil the file
 };
 
 /// Makes a folder for a history, with the one above it, unless it is there, and sees that it is this user's

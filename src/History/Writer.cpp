@@ -81,7 +81,8 @@ void Writer::work(const std::shared_ptr<State>& state) {
         const auto hasWork = [&] { return state->isStopping || !state->tasks.empty(); };
         if (!isWatching) {
             state->changed.wait(lock, hasWork);
-        } else if (!state->changed.wait_until(lock, next, hasWork)) {
+        } else if (!state->changed.wait_until(lock, next, hasWork) || Clock::now() >= next) {
+            // Also while there is always a task: refusals can come without end.
             lock.unlock();
             isWatching = guarded(state->perSecond);
             next = Clock::now() + kSecond;

@@ -4,16 +4,22 @@
 #include <gmock/gmock.h>
 #include <sys/resource.h>
 #include <sys/stat.h>
+#include <sys/syscall.h>
 #include <sys/wait.h>
+#include <unistd.h>
 
 #include <algorithm>
+#include <atomic>
+#include <chrono>
 #include <csignal>
 #include <filesystem>
 #include <optional>
+#include <thread>
 
 #include "Providers/SoftwareUpdate/HookedBackend.h"
 #include "Support/SimulatedAdapters.h"
 #include "Support/SyslogCapture.h"
+#include "Utils/Export.h"
 #include "Utils/Os/Linux/linux.h"
 
 namespace {
@@ -21,6 +27,18 @@ namespace {
 using history::History;
 using history::Record;
 using ::testing::HasSubstr;
+
+std::atomic<int> syncs{0};
+
+}  // namespace
+
+/// SQLite finds this one before the C library's.
+extern "C" QUENX_EXPORT int fdatasync(int file) {
+    ++syncs;
+    return static_cast<int>(::syscall(SYS_fdatasync, file));
+}
+
+namespace {
 
 /// The adapters of SimulatedAdapters.h, one of which is at 43 % of an update.
 class Adapters : public test::HookedBackend {
@@ -108,6 +126,40 @@ TEST_F(HistoryTest, TakesNothingFromTheRecordBefore) {
     EXPECT_EQ(found[0].uri + found[0].address + found[0].adapter + found[0].reason, "");
     EXPECT_FALSE(found[0].returnValue);
     EXPECT_EQ(found[1].reason, "it was wrong");
+}
+
+TEST_F(HistoryTest, ShowsRefusalsAtOnceAndSyncsManyTogether) {
+    constexpr std::size_t kEach = 50;
+    History history(settings());
+    history.refused(attempt(), 5, core::ReasonId::ImageDamaged, "the first makes the file");
+    const int before = syncs;
+    {
+        std::vector<std::jthread> clients;
+        for (const char* adapter : {"eth0", "eth0", "none", ""})
+            clients.emplace_back([&history, adapter] {
+                core::UpdateAttempt wrong = attempt();
+                wrong.adapter = adapter;
+                wrong.mostRecords = 1000;
+                for (std::size_t i = 0; i < kEach; ++i)
+                    history.refused(wrong, 5, core::ReasonId::ImageDamaged, adapter);
+            });
+    }
+    const std::vector<Record> found = records();
+    EXPECT_EQ(found.size(), 1 + 4 * kEach);
+    for (const Record& record : found)
+        EXPECT_EQ(record.pciAddress, record.adapter == "eth0" ? "0000:03:00.0" : "") << record.reason;
+    const int during = syncs;
+    EXPECT_LT(during - before, 20);
+
+    history.refused(attempt(), 5, core::ReasonId::ImageDamaged, "the last");
+    const auto end = std::chrono::steady_clock::now() + std::chrono::seconds(10);
+    while (syncs == during && std::chrono::steady_clock::now() < end)
+        std::this_thread::sleep_for(std::chrono::milliseconds(20));
+    EXPECT_GT(syncs, during) << "it never reached the disk";
+
+    const int refused = syncs;
+    const auto running = history.begin(attempt());
+    EXPECT_GT(syncs, refused) << "an update waits for the disk";
 }
 
 TEST_F(HistoryTest, CompletesWhatAKilledProcessBeganAndNoOther) {
