@@ -4,9 +4,11 @@
 #
 #   ./test.sh                 the default build and the one with the address and undefined-behaviour sanitizers
 #   ./test.sh --ci            these, 32-bit x86, the thread sanitizer, 10 s of each fuzz target, elsewhere and kernel
+#   ./test.sh --nightly       kernel, packages and 32-bit x86: what CI may leave to the night where time is short
 #   ./test.sh PRESET...       just these: release asan tsan x86-32 clang; fuzz, whose targets the build asan has;
-#                             elsewhere, the demo and the release tests as another user in an odd folder; and kernel,
-#                             updates by the release build in a virtual machine with cards that the kernel flashes
+#                             elsewhere, the demo and the release tests as another user in an odd folder; kernel,
+#                             updates by the release build in a virtual machine with cards that the kernel flashes; and
+#                             packages, the Debian packages of the committed tree in a fresh root, which takes root
 #
 # CI=true in the environment means --ci. JOBS=N sets how many jobs run at once (default: one for each processor).
 set -euo pipefail
@@ -16,14 +18,15 @@ jobs="${JOBS:-$(nproc)}"
 fuzz_seconds="${FUZZ_SECONDS:-10}"
 groups=(build run test)
 fuzz_build=build/asan
-all_presets=(release asan x86-32 tsan fuzz elsewhere kernel clang)
+all_presets=(release asan x86-32 tsan fuzz elsewhere kernel packages clang)
 presets=()
 
 for argument in "$@"; do
     case "$argument" in
         --ci) CI=true ;;
+        --nightly) presets+=(kernel packages x86-32) ;;
         -h | --help)
-            sed -n '3,12s/^# \{0,1\}//p' "$0"
+            sed -n '3,14s/^# \{0,1\}//p' "$0"
             exit 0
             ;;
         -*)
@@ -46,6 +49,7 @@ if [ "${#presets[@]}" = 0 ]; then
     [ "${CI:-}" = true ] && presets+=(x86-32 tsan fuzz elsewhere kernel)
 fi
 case " ${presets[*]} " in *" x86-32 "*) groups+=(x86-32) ;; esac
+case " ${presets[*]} " in *" packages "*) groups+=(deb) ;; esac
 
 packaging/install-packages.sh "${groups[@]}"
 # A virtual machine is not to be had everywhere.
@@ -127,6 +131,13 @@ run_kernel_tests() {
     tests/kernel/run.sh
 }
 
+run_package_tests() {
+    echo "== packages: building"
+    nice packaging/build-deb.sh --no-install
+    echo "== packages: trying them in a fresh root"
+    packaging/try-packages.sh
+}
+
 # The tests of a run that were skipped, each with the reason that it gave.
 skipped_tests() {
     local log="build/$1/Testing/Temporary/LastTest.log"
@@ -157,6 +168,7 @@ for preset in "${presets[@]}"; do
         fuzz) run_fuzzers ;;
         elsewhere) tests/elsewhere.sh ;;
         kernel) run_kernel_tests ;;
+        packages) run_package_tests ;;
         *) run_tests "$preset" ;;
     esac
 done
