@@ -56,6 +56,34 @@ TEST(OutputTest, CutsAlignsAndDisarmsText) {
     EXPECT_EQ(out.str(), "A             B\nlong\\x0a\\x1b  x\ngröße         y\n              \n");
 }
 
+TEST(OutputTest, FitsATableToTheTerminal) {
+    const std::vector<std::vector<std::string>> rows = {
+        {"NAME", "WHERE", "WHY"}, {"eth0", "/a/long/path/without/a/space", "größer than what is there"}};
+    const auto printed = [&](std::size_t width) {
+        std::ostringstream out;
+        cli::printTable(out, rows, width);
+        return out.str();
+    };
+    const std::string whole =
+        "NAME  WHERE                         WHY\n"
+        "eth0  /a/long/path/without/a/space  größer than what is there\n";
+    EXPECT_EQ(printed(61), whole);
+    EXPECT_EQ(printed(60),
+              "NAME  WHERE                        WHY\n"
+              "eth0  /a/long/path/without/a/spac  größer than what is there\n"
+              "      e\n");
+    EXPECT_EQ(printed(30),
+              "NAME  WHERE        WHY\n"
+              "eth0  /a/long/pat  größer than\n"
+              "      h/without/a  what is\n"
+              "      /space       there\n");
+    EXPECT_EQ(printed(27),
+              "NAME   eth0\n"
+              "WHERE  /a/long/path/without/a/space\n"
+              "WHY    größer than what is there\n")
+        << "columns too narrow to read";
+}
+
 TEST(ProgressTest, FitsTheWidthAndSaysNoMoreThanItKnows) {
     const cli::UpdateProgress half{"eth0", 50, 256000, milliseconds(2000), 10};
     EXPECT_EQ(cli::barText(half, 80),

@@ -2,6 +2,8 @@
 #include "Cli/Display/Output.h"
 
 #include <algorithm>
+#include <numeric>
+#include <optional>
 
 #include "Cli/Display/Messages.h"
 #include "Cli/Display/Terminal.h"
@@ -25,6 +27,81 @@ std::string displayScalar(core::CimType type, const core::CimScalar& value) {
     return printable(isText ? utils::quoted(text) : text);
 }
 
+using Row = std::vector<std::string>;
+using Rows = std::vector<Row>;
+
+constexpr std::size_t kGap = 2;  // between two columns
+
+/// Measured as printed: a control character takes four columns.
+Rows disarmed(Rows rows) {
+    for (Row& row : rows)
+        for (std::string& cell : row)
+            cell = printable(cell);
+    return rows;
+}
+
+std::vector<std::size_t> columnWidths(const Rows& rows) {
+    // A longer cell does not widen its column: it would take as many spaces in each of the other rows.
+    constexpr std::size_t kWidest = 200;
+    std::vector<std::size_t> widths;
+    for (const Row& row : rows) {
+        widths.resize(std::max(widths.size(), row.size()));
+        for (std::size_t i = 0; i < row.size(); ++i)
+            widths[i] = std::max(widths[i], std::min(columnsOf(row[i]), kWidest));
+    }
+    return widths;
+}
+
+/// The widest columns made narrower until all fit; nothing where they would become too narrow to read. The
+/// first column stays whole: it names the row, and people copy it.
+std::optional<std::vector<std::size_t>> fittedWidths(std::vector<std::size_t> widths, std::size_t width) {
+    constexpr std::size_t kNarrowest = 10;
+    const auto total = [&] {
+        return std::accumulate(widths.begin(), widths.end(), kGap * (widths.size() - 1));
+    };
+    while (widths.size() > 1 && total() > width) {
+        const auto widest = std::max_element(widths.begin() + 1, widths.end());
+        if (*widest <= kNarrowest) return std::nullopt;
+        --*widest;
+    }
+    return widths;
+}
+
+void printLine(std::ostream& out, const Row& row, const std::vector<std::size_t>& widths) {
+    // Nothing follows the last cell, so no spaces either.
+    for (std::size_t i = 0; i < row.size(); ++i) {
+        out << row[i];
+        if (i + 1 < row.size())
+            out << std::string(widths[i] + kGap - std::min(columnsOf(row[i]), widths[i]), ' ');
+    }
+    out << '\n';
+}
+
+/// The row on as many lines as its longest cell takes.
+void printWrapped(std::ostream& out, Row rest, const std::vector<std::size_t>& widths) {
+    while (std::ranges::any_of(rest, [](const std::string& cell) { return !cell.empty(); })) {
+        Row line;
+        for (std::size_t i = 0; i < rest.size(); ++i)
+            line.push_back(takeLine(rest[i], widths[i]));
+        while (line.back().empty())
+            line.pop_back();
+        printLine(out, line, widths);
+    }
+}
+
+/// For a terminal too narrow for the table: a block of lines for each row, with the heading before each cell.
+void printBlocks(std::ostream& out, const Rows& rows) {
+    const Row& headings = rows.front();
+    std::size_t width = 0;
+    for (const std::string& heading : headings)
+        width = std::max(width, columnsOf(heading));
+    for (std::size_t row = 1; row < rows.size(); ++row) {
+        if (row > 1) out << '\n';
+        for (std::size_t i = 0; i < rows[row].size(); ++i)
+            printLine(out, {headings[i], rows[row][i]}, {width, 0});
+    }
+}
+
 }  // namespace
 
 void printJson(std::ostream& out, const Json& document) {
@@ -35,25 +112,22 @@ std::string jsonLine(const Json& document) {
     return document.dump(-1, ' ', true, Json::error_handler_t::replace);
 }
 
-void printTable(std::ostream& out, const std::vector<std::vector<std::string>>& rows) {
-    // A longer cell does not widen its column: it would take as many spaces in each of the other rows.
-    constexpr std::size_t kWidest = 200;
-    // Measured as printed: a control character takes four columns.
-    std::vector<std::size_t> widths;
-    for (const auto& row : rows) {
-        widths.resize(std::max(widths.size(), row.size()));
-        for (std::size_t i = 0; i < row.size(); ++i)
-            widths[i] = std::max(widths[i], std::min(columnsOf(printable(row[i])), kWidest));
-    }
-    for (const auto& row : rows) {
-        for (std::size_t i = 0; i < row.size(); ++i) {
-            const std::string cell = printable(row[i]);
-            out << cell;
-            // Nothing follows the last cell, so no spaces either.
-            if (i + 1 < row.size())
-                out << std::string(widths[i] + 2 - std::min(columnsOf(cell), widths[i]), ' ');
-        }
-        out << '\n';
+void printTable(std::ostream& out, const Rows& rows) {
+    printTable(out, rows, widthOf(out));
+}
+
+void printTable(std::ostream& out, const Rows& rows, std::size_t width) {
+    const Rows shown = disarmed(rows);
+    const std::vector<std::size_t> widths = columnWidths(shown);
+    const std::optional<std::vector<std::size_t>> fitting = fittedWidths(widths, width);
+    // Two columns may have no headings, and a block would be no narrower.
+    if (!fitting && widths.size() > 2) return printBlocks(out, shown);
+    const bool isWrapped = fitting && *fitting != widths;
+    for (const Row& row : shown) {
+        if (isWrapped)
+            printWrapped(out, row, *fitting);
+        else
+            printLine(out, row, widths);
     }
 }
 

@@ -21,8 +21,13 @@ void printJson(std::ostream& out, const Json& document);
 /// The same on a line, without its end.
 std::string jsonLine(const Json& document);
 
-/// Prints rows with each column as wide as its widest cell; control characters in cells are made visible.
+/// Prints rows with each column as wide as its widest cell; control characters in cells are made visible. On
+/// a terminal the table is made to fit its width; nothing is left out.
 void printTable(std::ostream& out, const std::vector<std::vector<std::string>>& rows);
+
+/// The same in at most `width` columns where that can be: long cells go on below, and where there are too
+/// many columns for that, each row becomes a block of lines with the headings of the first row.
+void printTable(std::ostream& out, const std::vector<std::vector<std::string>>& rows, std::size_t width);
 
 /// The value as one line for a person: strings in quotes, arrays in braces, "NULL".
 std::string displayText(const core::CimValue& value);

@@ -8,6 +8,8 @@
 #include <algorithm>
 #include <cstdlib>
 #include <iostream>
+#include <limits>
+#include <utility>
 
 #include "CimXml/Xml.h"
 #include "Utils/Utils.h"
@@ -52,6 +54,13 @@ std::size_t bytesOfFirst(std::string_view text, std::size_t characters) {
     return bytes;
 }
 
+/// 0 where there is no terminal, or it does not say.
+std::size_t columnsOfTerminal(int descriptor) {
+    winsize size{};
+    const bool isTold = descriptor >= 0 && ioctl(descriptor, TIOCGWINSZ, &size) == 0;
+    return isTold ? size.ws_col : 0;
+}
+
 }  // namespace
 
 std::string printable(std::string_view text) {
@@ -86,6 +95,22 @@ std::string elideMiddle(std::string_view text, std::size_t width) {
            std::string(text.substr(bytesOfFirst(text, columns - tail)));
 }
 
+std::string takeLine(std::string& text, std::size_t width) {
+    if (columnsOf(text) <= width) return std::exchange(text, {});
+    // A space right behind the last column ends the line, too.
+    const std::size_t most = bytesOfFirst(text, width);
+    const std::size_t space = text.rfind(' ', most);
+    const bool isBetweenWords = space != std::string::npos && space != 0;
+    std::string line = text.substr(0, isBetweenWords ? space : most);
+    text.erase(0, isBetweenWords ? space + 1 : most);
+    return line;
+}
+
+std::size_t widthOf(const std::ostream& out) {
+    const std::size_t columns = &out == &std::cout ? columnsOfTerminal(STDOUT_FILENO) : 0;
+    return columns == 0 ? std::numeric_limits<std::size_t>::max() : columns;
+}
+
 Terminal Terminal::of(int descriptor) {
     // NO_COLOR asks for no colours, but people set it wherever escape sequences do harm.
     const char* term = std::getenv("TERM");
@@ -95,9 +120,8 @@ Terminal Terminal::of(int descriptor) {
 
 std::size_t Terminal::width() const {
     constexpr std::size_t kUsual = 80;
-    winsize size{};
-    if (descriptor < 0 || ioctl(descriptor, TIOCGWINSZ, &size) != 0 || size.ws_col == 0) return kUsual;
-    return size.ws_col;
+    const std::size_t columns = columnsOfTerminal(descriptor);
+    return columns == 0 ? kUsual : columns;
 }
 
 std::optional<std::string> askOnTerminal(const std::string& prompt,

@@ -21,6 +21,14 @@ std::size_t columnsOf(std::string_view text);
 /// The text cut in the middle to at most `width` columns, "..." in the place of what is left out.
 std::string elideMiddle(std::string_view text, std::size_t width);
 
+/// Takes from the text what fits into `width` columns, up to a space where there is one; a text without any
+/// is cut anywhere. @param width  at least 1
+std::string takeLine(std::string& text, std::size_t width);
+
+/// The columns of the terminal that the stream writes to; no limit for a pipe or a file, for another stream
+/// than standard output, and where the terminal does not say.
+std::size_t widthOf(const std::ostream& out);
+
 /// What a file descriptor can show: asked once, when the program starts.
 struct Terminal {
     /// True when a line can be written over: a terminal, unless TERM is "dumb" or NO_COLOR is set.
