@@ -136,6 +136,8 @@ run_package_tests() {
     nice packaging/build-deb.sh --no-install
     echo "== packages: trying them in a fresh root"
     packaging/try-packages.sh
+    echo "== packages: the profiles that confine the daemon"
+    packaging/check-confinement.sh
 }
 
 # The tests of a run that were skipped, each with the reason that it gave.
