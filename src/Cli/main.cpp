@@ -108,9 +108,12 @@ ExitStatus report(bool json, ExitStatus status, const std::string& what, const s
 }
 
 ExitStatus runVerb(const Arguments& arguments) {
+    std::ostream nowhere(nullptr);
+    std::ostream& out = arguments.isSilent() ? nowhere : std::cout;
     // Standard output is for the document then.
-    LinePrinter printer(arguments.json ? std::cerr : std::cout,
-                        Terminal::of(arguments.json ? STDERR_FILENO : STDOUT_FILENO));
+    LinePrinter printer(
+        arguments.json ? std::cerr : out,
+        arguments.isSilent() ? Terminal() : Terminal::of(arguments.json ? STDERR_FILENO : STDOUT_FILENO));
     ProgressDisplay progress(printer);
     // Outlives the connection, which waits for the updates of this process.
     std::optional<NotedInterruptions> interruptions;
@@ -132,7 +135,7 @@ ExitStatus runVerb(const Arguments& arguments) {
                                  .untilTheEnd = connection.isInProcess,
                                  .over = letInterruptionsEnd};
     Context context{.connection = connection,
-                    .out = std::cout,
+                    .out = out,
                     .error = std::cerr,
                     .json = arguments.json,
                     .progress = progress,

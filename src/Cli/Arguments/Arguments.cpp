@@ -55,6 +55,10 @@ void addCommonOptions(CLI::App& app, Arguments& arguments) {
     ProviderSettings& providers = arguments.providers;
     app.add_flag("--json", arguments.json,
                  "Print the result, or the error, as one JSON document; progress goes to standard error");
+    app.add_flag("--quiet", arguments.quiet,
+                 "Print neither progress nor success of what installs, checks, deletes or releases; errors "
+                 "and the exit status tell the rest")
+        ->excludes("--json");
     CLI::Option* config =
         addValue(app, "--config", providers.configFile, "FILE",
                  "Configuration file of the providers (default: /etc/quenx-cimprovider.conf)");
@@ -100,6 +104,13 @@ void requireOneImage(const CLI::App& app, const Arguments& arguments) {
     if (!takesImage || update.image.empty() != update.identity.empty()) return;
     throw CommandError(ExitStatus::WrongUse, "Name one image, either as a file or with --identity.",
                        askHelpOf(*app.get_subcommands().front()));
+}
+
+/// For whoever has just met the program. A script that forgets the verb is told so.
+void chooseOverview(const CLI::App& app, Arguments& arguments) {
+    if (!app.get_subcommands().empty()) return;
+    if (arguments.json) throw CommandError(ExitStatus::WrongUse, "No verb was given.", kAskHelp);
+    arguments.verb = showOverview;
 }
 
 /// Who resets a card has to be where its network is, and who registers libraries where they are.
@@ -162,7 +173,7 @@ std::optional<Arguments> readArguments(int argc, char** argv) {
     Arguments arguments;
     CLI::App app("Updates the firmware of Ethernet adapters.", "quenxctl");
     app.set_version_flag("--version", QUENX_VERSION);
-    app.require_subcommand(1);
+    app.require_subcommand(0, 1);
     app.fallthrough();  // options of every verb may come after the verb, too
     addCommonOptions(app, arguments);
     addVerbs(app, arguments);
@@ -197,6 +208,7 @@ std::optional<Arguments> readArguments(int argc, char** argv) {
         printHelp(app, helpOf);
         return std::nullopt;
     }
+    chooseOverview(app, arguments);
     requireOneTarget(app, arguments);
     requireOneImage(app, arguments);
     requireOwnMachine(arguments);

@@ -12,11 +12,16 @@ struct Arguments {
     Verb verb = nullptr;
     VerbOptions options;
     bool json = false;
+    bool quiet = false;
     ProviderSettings providers;
     ServerSettings server;  ///< without a URL: the providers run in this process
 
     /// The verb may start one, so must not be ended half-way.
     bool startsUpdate() const { return verb == install || verb == rollback || verb == activate; }
+    /// Nobody has asked for the output of the verb, only for what it does.
+    bool isSilent() const {
+        return quiet && (startsUpdate() || verb == check || verb == deleteJob || verb == releaseAdapter);
+    }
 };
 
 /// Reads the command line. Nothing when it only asked for help or the version, which has been printed then.

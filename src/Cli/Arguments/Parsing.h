@@ -21,6 +21,8 @@ CLI::Option* addValue(CLI::App& app, const char* name, Value& value, const char*
 /// then fills the arguments, which have to live until that is done.
 void addVerbs(CLI::App& app, Arguments& arguments);
 
+inline constexpr const char* kAskHelp = "\"quenxctl --help\" lists the verbs and options.";
+
 /// Every verb that was added.
 std::vector<const CLI::App*> verbsOf(const CLI::App& app);
 

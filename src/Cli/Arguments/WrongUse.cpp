@@ -9,8 +9,6 @@ namespace cli {
 
 namespace {
 
-constexpr const char* kAskHelp = "\"quenxctl --help\" lists the verbs and options.";
-
 bool isLongOption(const std::string& word) {
     return word.size() > 2 && word.starts_with("--");
 }
@@ -91,16 +89,15 @@ std::string askHelpOf(const CLI::App& verb) {
 }
 
 CommandError wrongUse(const CLI::App& app, const CLI::ParseError& error) {
-    // The library only says that a verb is missing, both where there is none and where it is unknown.
     const auto verbs = app.get_subcommands();
     const CLI::App* verb = verbs.empty() ? nullptr : verbs.front();
     if (const std::optional<CommandError> unknown = unknownOption(app, verb)) return *unknown;
     if (verb != nullptr) return {ExitStatus::WrongUse, messageOf(app, *verb, error), askHelpOf(*verb)};
-    if (error.get_exit_code() != static_cast<int>(CLI::ExitCodes::RequiredError))
-        return {ExitStatus::WrongUse, messageOf(app, app, error), kAskHelp};
+    // A word that belongs to nothing stands where a verb would.
     const std::vector<std::string> rest = app.remaining();
-    return rest.empty() ? CommandError(ExitStatus::WrongUse, "No verb was given.", kAskHelp)
-                        : unknownVerb(app, rest.front());
+    if (error.get_exit_code() == static_cast<int>(CLI::ExitCodes::ExtrasError) && !rest.empty())
+        return unknownVerb(app, rest.front());
+    return {ExitStatus::WrongUse, messageOf(app, app, error), kAskHelp};
 }
 
 }  // namespace cli

@@ -127,18 +127,14 @@ ExitStatus showPending(Context& context, std::vector<Adapter> adapters) {
 
 }  // namespace
 
-ExitStatus showAdapters(Context& context, const VerbOptions& options) {
-    std::vector<Adapter> adapters = readAdapters(*context.connection.operations);
-    if (options.pendingOnly) return showPending(context, std::move(adapters));
-    if (context.json) {
-        printJson(context.out, {{"adapters", adapters}, {"search", searchText(context.connection)}});
-        return ExitStatus::Done;
-    }
+namespace {
+
+void printAdapters(Context& context, const std::vector<Adapter>& adapters) {
     if (adapters.empty()) {
         context.out << "There are no adapters.\n";
         const std::string advice = adviceForNoAdapters(context.connection);
         if (!advice.empty()) context.out << printable(advice) << '\n';
-        return ExitStatus::Done;
+        return;
     }
     std::vector<std::vector<std::string>> rows = {
         {"NAME", "BACKEND", "PCI", "IDS", "UPDATABLE", "FIRMWARE", "DESCRIPTION"}};
@@ -158,6 +154,43 @@ ExitStatus showAdapters(Context& context, const VerbOptions& options) {
         if (!advice.empty()) context.out << printable(advice) << '\n';
     }
     tellSilentOnes(context, silentOnes(adapters));
+}
+
+/// The first steps, with the name of an adapter for which they work.
+std::vector<std::vector<std::string>> nextSteps(const std::vector<Adapter>& adapters) {
+    std::vector<std::vector<std::string>> steps;
+    const auto free = std::ranges::find_if(
+        adapters, [](const Adapter& adapter) { return adapter.updatable && !adapter.busy; });
+    if (free != adapters.end()) {
+        steps.push_back({"quenxctl check --target " + free->name + " IMAGE", "whether an image fits"});
+        steps.push_back({"quenxctl install --target " + free->name + " IMAGE", "write it"});
+    }
+    if (std::ranges::any_of(adapters, &Adapter::waitsForReset))
+        steps.push_back({"quenxctl adapters --pending", "new firmware that does not run yet"});
+    if (std::ranges::any_of(adapters, &Adapter::busy))
+        steps.push_back({"quenxctl status", "who writes to which adapter"});
+    steps.push_back({"quenxctl history", "what was done, by whom, and how it ended"});
+    steps.push_back({"quenxctl help", "everything else"});
+    return steps;
+}
+
+}  // namespace
+
+ExitStatus showAdapters(Context& context, const VerbOptions& options) {
+    std::vector<Adapter> adapters = readAdapters(*context.connection.operations);
+    if (options.pendingOnly) return showPending(context, std::move(adapters));
+    if (context.json)
+        printJson(context.out, {{"adapters", adapters}, {"search", searchText(context.connection)}});
+    else
+        printAdapters(context, adapters);
+    return ExitStatus::Done;
+}
+
+ExitStatus showOverview(Context& context, const VerbOptions&) {
+    const std::vector<Adapter> adapters = readAdapters(*context.connection.operations);
+    printAdapters(context, adapters);
+    context.out << "\nWhat you can do next:\n";
+    printTable(context.out, nextSteps(adapters));
     return ExitStatus::Done;
 }
 

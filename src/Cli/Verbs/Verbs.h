@@ -71,6 +71,8 @@ struct VerbOptions {
 using Verb = ExitStatus (*)(Context& context, const VerbOptions& options);
 
 ExitStatus showAdapters(Context& context, const VerbOptions& options);
+/// The adapters, and what can be done with them next: for who has named no verb.
+ExitStatus showOverview(Context& context, const VerbOptions& options);
 /// One a line, with a tab and a description. Not in the help: for the scripts of shells.
 ExitStatus showCandidates(Context& context, const VerbOptions& options);
 ExitStatus showIdentities(Context& context, const VerbOptions& options);
