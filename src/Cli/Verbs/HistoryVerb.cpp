@@ -4,6 +4,7 @@
 #include <ctime>
 
 #include "Cli/Display/Records.h"
+#include "Cli/Display/Terminal.h"
 #include "Cli/Update/ServedLog.h"
 #include "Cli/Verbs/Verbs.h"
 #include "Utils/Utils.h"
@@ -75,6 +76,12 @@ std::string userText(const Record& record) {
     return isHere ? record.user : record.user + " at " + record.address;
 }
 
+/// The file's name; a long one would push the details off every line. --json has it whole.
+std::string imageText(const Record& record) {
+    constexpr std::size_t kLongest = 40;
+    return elideMiddle(record.uri.substr(record.uri.rfind('/') + 1), kLongest);
+}
+
 void printRecords(std::ostream& out, const std::vector<Record>& records) {
     std::vector<std::vector<std::string>> rows{
         {"ID", "TIME", "ADAPTER", "OUTCOME", "USER", "THROUGH", "IMAGE", "DETAILS"}};
@@ -82,8 +89,8 @@ void printRecords(std::ostream& out, const std::vector<Record>& records) {
     for (const Record& record : records) {
         rows.push_back({std::to_string(record.id), localTimeText(record.begun),
                         orDash(labelOf(record.adapter, record.backend)), outcomeText(record),
-                        orDash(userText(record)), orDash(record.front),
-                        orDash(record.uri.substr(record.uri.rfind('/') + 1)), detailsOf(record)});
+                        orDash(userText(record)), orDash(record.front), orDash(imageText(record)),
+                        detailsOf(record)});
     }
     printTable(out, rows);
 }
