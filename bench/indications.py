@@ -121,7 +121,8 @@ class Server:
     def update(self):
         """Carries out one, and returns how long its job ran, in seconds."""
         adapter, file = self.daemon.choose(self._random, "eth0")
-        command = self.daemon.command(self.life, "the Unix socket", "install", "--target", adapter, "--force", str(file))
+        command = self.daemon.command(self.life, "the Unix socket", "install", "--target", adapter, "--force",
+                                      str(file))
         status, said = self.daemon.finish(command)
         if status != 0:
             sys.exit(str(said))
