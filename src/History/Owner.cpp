@@ -6,7 +6,6 @@
 #include <cstdlib>
 #include <filesystem>
 #include <random>
-#include <sstream>
 
 #include "Utils/Utils.h"
 
@@ -30,21 +29,10 @@ std::string asTheKernelWritesIt(std::string id) {
     return id;
 }
 
-/// The 22nd field of the line; the second one, the name, may hold blanks and parentheses.
-std::string startTime() {
-    constexpr int kFieldsAfterName = 20;
-    const std::string line = systemText("/proc/self/stat");
-    std::istringstream fields(line.substr(std::min(line.rfind(')') + 1, line.size())));
-    std::string field;
-    for (int i = 0; i < kFieldsAfterName; ++i)
-        fields >> field;
-    return fields ? field : "";
-}
-
 /// The number of a process that died may be given again; these names are not.
 std::string uniqueName() {
     std::random_device random;
-    return kPrefix + std::to_string(::getpid()) + "-" + startTime() + "-" + std::to_string(random());
+    return kPrefix + std::to_string(::getpid()) + "-" + std::to_string(random());
 }
 
 }  // namespace

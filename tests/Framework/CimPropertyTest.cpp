@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-#include <gtest/gtest.h>
+#include <gmock/gmock.h>
 
 #include "Framework/Model/CimError.h"
 #include "Framework/Model/CimPropertyList.h"
@@ -29,6 +29,14 @@ TEST(CimPropertyTest, ChecksAllOfAModificationFirst) {
     EXPECT_THROW(modify("Nothing", String, "there"), core::CimError);
     EXPECT_TRUE(gadget.Codes.IsNull());
     EXPECT_EQ(gadget.Caption.get(), "Gadget x");
+
+    for (const char* asLongAsAllowed : {"12345", "12"})
+        EXPECT_EQ(modify("Caption", String, asLongAsAllowed), 0U);
+    for (const auto& [text, bound] : {std::pair{"123456", "at most 5"}, {"1", "at least 2"}}) {
+        const std::string refused = text;
+        const std::function<void()> attempt = [&] { modify("Caption", String, refused); };
+        EXPECT_THAT(attempt, ::testing::ThrowsMessage<core::CimError>(::testing::HasSubstr(bound)));
+    }
 
     EXPECT_EQ(modify("caption", String, "fits"), 0U);
     EXPECT_EQ(gadget.Caption.get(), "fits");

@@ -13,9 +13,11 @@
 #include <chrono>
 #include <csignal>
 #include <filesystem>
+#include <fstream>
 #include <optional>
 #include <thread>
 
+#include "History/Owner.h"
 #include "Providers/SoftwareUpdate/HookedBackend.h"
 #include "Support/SimulatedAdapters.h"
 #include "Support/SyslogCapture.h"
@@ -111,6 +113,13 @@ TEST_F(HistoryTest, KeepsARefusalAndAnUpdateForThisUserAlone) {
         EXPECT_EQ(::stat(path.c_str(), &status), 0) << path;
         EXPECT_EQ(status.st_mode & 0777U, mode) << path;
     }
+}
+
+TEST(OwnerTest, KnowsTheStartOfTheMachine) {
+    std::string id;
+    std::getline(std::ifstream("/proc/sys/kernel/random/boot_id"), id);
+    EXPECT_EQ(history::bootId(), id);
+    EXPECT_EQ(id.size(), 36U);
 }
 
 TEST_F(HistoryTest, TakesNothingFromTheRecordBefore) {

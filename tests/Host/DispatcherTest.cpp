@@ -301,7 +301,7 @@ TEST_F(DispatcherTest, LeavesOneAuditLineForEachChangeAndRefusal) {
                                  R"(arguments="" outcome="denied: user )" + name +
                                  R"( may only read" reason="QX-0502")");
     EXPECT_LT(lines[3].text.size(), 1400U);
-    EXPECT_NE(lines[3].text.find(std::string(64, 'u') + R"(\..." address="192.0.2.1")"), std::string::npos);
+    EXPECT_NE(lines[3].text.find("user=\"" + std::string(64, 'u') + R"(\..." address="192.0.2.1")"), std::string::npos);
     const std::string cut = "=\"denied: user " + std::string(256 - 13, 'u') + R"(\..." reason="QX-0502")";
     EXPECT_TRUE(lines[3].text.ends_with(cut)) << lines[3].text;
 }

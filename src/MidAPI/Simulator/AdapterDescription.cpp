@@ -145,10 +145,10 @@ AdapterDescription readAdapter(const toml::table& node, const TomlTable& top, st
     readPlace(table, adapter);
     readIds(table, adapter.ids);
     adapter.description = table.text("description").value_or("");
-    adapter.speed = table.number<std::uint64_t>("speed", kHighestSpeed).value_or(0);
-    adapter.linkUp = table.flag("link", true);
-    adapter.canBeUpdated = table.flag("updatable", true);
-    adapter.writeSpeed = table.number<std::uint64_t>("write_speed", kHighestSpeed).value_or(0);
+    adapter.speed = table.number<std::uint64_t>("speed", kHighestSpeed).value_or(adapter.speed);
+    adapter.linkUp = table.flag("link", adapter.linkUp);
+    adapter.canBeUpdated = table.flag("updatable", adapter.canBeUpdated);
+    adapter.writeSpeed = table.number<std::uint64_t>("write_speed", kHighestSpeed).value_or(adapter.writeSpeed);
     adapter.bootType = static_cast<BootType>(table.choice("boot_type", kBootTypes).value_or(0));
     adapter.flashFile = table.text("flash_file").value_or("");
     for (const toml::table* component : table.tables("components"))
