@@ -102,8 +102,7 @@ ExitStatus report(bool json, ExitStatus status, const std::string& what, const s
         printJson(std::cout, error);
         return status;
     }
-    std::cerr << "quenxctl: " << printable(what) << '\n';
-    if (!advice.empty()) std::cerr << printable(advice) << '\n';
+    printFailure(std::cerr, what, advice);
     return status;
 }
 
@@ -145,7 +144,12 @@ ExitStatus runVerb(const Arguments& arguments) {
 
 /// @param arguments  set once they are read
 ExitStatus runAndReport(int argc, char** argv, std::optional<Arguments>& arguments) {
-    const bool json = asksForJson(argc, argv);
+    const bool json = asksFor("--json", argc, argv);
+    // Who reads a document, or as little as there can be, is a script, also where it runs on a terminal.
+    if (!json && !asksFor("--quiet", argc, argv)) {
+        allowColours(std::cout, Terminal::of(STDOUT_FILENO));
+        allowColours(std::cerr, Terminal::of(STDERR_FILENO));
+    }
     const core::NotedCall noted;
     try {
         arguments = readArguments(argc, argv);

@@ -57,8 +57,8 @@ TEST(OutputTest, CutsAlignsAndDisarmsText) {
 }
 
 TEST(OutputTest, FitsATableToTheTerminal) {
-    const std::vector<std::vector<std::string>> rows = {
-        {"NAME", "WHERE", "WHY"}, {"eth0", "/a/long/path/without/a/space", "größer than what is there"}};
+    const cli::Rows rows = {{"NAME", "WHERE", "WHY"},
+                            {"eth0", "/a/long/path/without/a/space", "größer than what is there"}};
     const auto printed = [&](std::size_t width) {
         std::ostringstream out;
         cli::printTable(out, rows, width);
@@ -82,6 +82,31 @@ TEST(OutputTest, FitsATableToTheTerminal) {
               "WHERE  /a/long/path/without/a/space\n"
               "WHY    größer than what is there\n")
         << "columns too narrow to read";
+}
+
+/// What the stream shows of this, without its escape sequences, and how many of them there were.
+std::pair<std::string, std::size_t> withoutColours(std::string shown) {
+    std::size_t count = 0;
+    for (std::size_t at = 0; (at = shown.find("\x1B[", at)) != std::string::npos; ++count)
+        shown.erase(at, shown.find('m', at) + 1 - at);
+    return {shown, count};
+}
+
+TEST(ColourTest, LeavesTablesAsTheyAre) {
+    const cli::Rows rows = {{"NAME", "OUTCOME", "WHY"},
+                            {"eth0", {"größer\x1B", cli::Look::Failure}, "too long for the line, as it is"}};
+    for (const std::size_t width : {200U, 40U, 20U}) {
+        std::ostringstream plain;
+        cli::printTable(plain, rows, width);
+        std::ostringstream coloured;
+        cli::allowColours(coloured, {.canRewrite = true});
+        cli::printTable(coloured, rows, width);
+        const auto [text, count] = withoutColours(coloured.str());
+        EXPECT_EQ(text, plain.str());
+        // A device's own sequence does not become one.
+        EXPECT_EQ(count, 2 * 4U);
+        EXPECT_NE(coloured.str().find("\x1B[31mgrößer\\x1b\x1B[0m"), std::string::npos);
+    }
 }
 
 TEST(ProgressTest, FitsTheWidthAndSaysNoMoreThanItKnows) {

@@ -14,7 +14,9 @@ using test::contains;
 using test::HeldFlash;
 using test::Program;
 using test::ProgramResult;
+using ::testing::ContainsRegex;
 using ::testing::HasSubstr;
+using ::testing::Not;
 
 constexpr const char* kNew = "IMG_PXE 2, IMG_UEFI 2";
 const std::string kInstall = "install --target eth0 IMAGE";
@@ -36,6 +38,36 @@ TEST_F(InstallTest, ShowsABarOnATerminalOnly) {
         EXPECT_EQ(contains(out, "eth0  ["), hasBar) << out;
         EXPECT_EQ(contains(out, "eth0: 0 %"), !hasBar) << out;
         EXPECT_TRUE(contains(out, "100 %")) << out;
+    }
+}
+
+TEST_F(InstallTest, HasColoursOnATerminalOnly) {
+    // As they come: a table, a success, a failure with a hint.
+    const std::pair<std::string, std::string> table[] = {
+        {"adapters", "\x1B[1mNAME\x1B[0m  "},
+        {"install --force --target eth0 IMAGE", "\x1B[32meth0"},
+        {"install --target eth0 missing.rom", "\x1B[31mquenxctl:\x1B[0m "},
+        {"install --target eth0 missing.rom", "\r\n\x1B[2m"},
+        {"instal", "\x1B[31mquenxctl:\x1B[0m "},
+    };
+    const auto shown = [this](const std::string& line, Program::Output output,
+                              const std::vector<std::string>& environment) {
+        const ProgramResult result = Program(command(line), output, environment).finish();
+        return result.out + result.error;
+    };
+    const std::vector<std::string> usual = {"TERM=xterm", "NO_COLOR="};
+    for (const auto& [line, look] : table) {
+        EXPECT_THAT(shown(line, Program::Output::Terminal, usual), HasSubstr(look)) << line;
+        const std::string others[] = {
+            shown(line, Program::Output::Pipes, usual),
+            shown(line, Program::Output::Terminal, {"TERM=dumb", "NO_COLOR="}),
+            shown(line, Program::Output::Terminal, {"TERM=xterm", "NO_COLOR=1"}),
+            shown("--json " + line, Program::Output::Terminal, usual),
+            shown("--quiet " + line, Program::Output::Terminal, usual),
+        };
+        // The bar, which --json keeps on standard error, is written over with another sequence.
+        for (const std::string& other : others)
+            EXPECT_THAT(other, Not(ContainsRegex("\x1B\\[[0-9]+m"))) << line;
     }
 }
 

@@ -221,10 +221,9 @@ std::optional<Arguments> readArguments(int argc, char** argv) {
     return arguments;
 }
 
-bool asksForJson(int argc, char** argv) {
-    // Looked for here, since reading ends at the first mistake, and --json may come after that.
-    return std::any_of(argv, argv + argc,
-                       [](const char* word) { return std::string_view(word) == "--json"; });
+bool asksFor(std::string_view flag, int argc, char** argv) {
+    // Looked for here, since reading ends at the first mistake, and the flag may come after that.
+    return std::any_of(argv, argv + argc, [flag](const char* word) { return flag == word; });
 }
 
 }  // namespace cli

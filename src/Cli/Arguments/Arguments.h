@@ -28,7 +28,7 @@ struct Arguments {
 /// Throws CommandError for wrong use.
 std::optional<Arguments> readArguments(int argc, char** argv);
 
-/// Whether errors are to be JSON: known also of a command line that cannot be read.
-bool asksForJson(int argc, char** argv);
+/// Whether the flag is there, such as "--json": known also of a command line that cannot be read.
+bool asksFor(std::string_view flag, int argc, char** argv);
 
 }  // namespace cli

@@ -27,16 +27,13 @@ std::string displayScalar(core::CimType type, const core::CimScalar& value) {
     return printable(isText ? utils::quoted(text) : text);
 }
 
-using Row = std::vector<std::string>;
-using Rows = std::vector<Row>;
-
 constexpr std::size_t kGap = 2;  // between two columns
 
 /// Measured as printed: a control character takes four columns.
 Rows disarmed(Rows rows) {
     for (Row& row : rows)
-        for (std::string& cell : row)
-            cell = printable(cell);
+        for (Cell& cell : row)
+            cell.text = printable(cell.text);
     return rows;
 }
 
@@ -47,7 +44,7 @@ std::vector<std::size_t> columnWidths(const Rows& rows) {
     for (const Row& row : rows) {
         widths.resize(std::max(widths.size(), row.size()));
         for (std::size_t i = 0; i < row.size(); ++i)
-            widths[i] = std::max(widths[i], std::min(columnsOf(row[i]), kWidest));
+            widths[i] = std::max(widths[i], std::min(columnsOf(row[i].text), kWidest));
     }
     return widths;
 }
@@ -70,20 +67,21 @@ std::optional<std::vector<std::size_t>> fittedWidths(std::vector<std::size_t> wi
 void printLine(std::ostream& out, const Row& row, const std::vector<std::size_t>& widths) {
     // Nothing follows the last cell, so no spaces either.
     for (std::size_t i = 0; i < row.size(); ++i) {
-        out << row[i];
+        const auto& [text, look] = row[i];
+        out << coloured(out, look, text);
         if (i + 1 < row.size())
-            out << std::string(widths[i] + kGap - std::min(columnsOf(row[i]), widths[i]), ' ');
+            out << std::string(widths[i] + kGap - std::min(columnsOf(text), widths[i]), ' ');
     }
     out << '\n';
 }
 
 /// The row on as many lines as its longest cell takes.
 void printWrapped(std::ostream& out, Row rest, const std::vector<std::size_t>& widths) {
-    while (std::ranges::any_of(rest, [](const std::string& cell) { return !cell.empty(); })) {
+    while (std::ranges::any_of(rest, [](const Cell& cell) { return !cell.text.empty(); })) {
         Row line;
         for (std::size_t i = 0; i < rest.size(); ++i)
-            line.push_back(takeLine(rest[i], widths[i]));
-        while (line.back().empty())
+            line.emplace_back(takeLine(rest[i].text, widths[i]), rest[i].look);
+        while (line.back().text.empty())
             line.pop_back();
         printLine(out, line, widths);
     }
@@ -93,12 +91,26 @@ void printWrapped(std::ostream& out, Row rest, const std::vector<std::size_t>& w
 void printBlocks(std::ostream& out, const Rows& rows) {
     const Row& headings = rows.front();
     std::size_t width = 0;
-    for (const std::string& heading : headings)
-        width = std::max(width, columnsOf(heading));
+    for (const Cell& heading : headings)
+        width = std::max(width, columnsOf(heading.text));
     for (std::size_t row = 1; row < rows.size(); ++row) {
         if (row > 1) out << '\n';
         for (std::size_t i = 0; i < rows[row].size(); ++i)
             printLine(out, {headings[i], rows[row][i]}, {width, 0});
+    }
+}
+
+void printFitted(std::ostream& out, const Rows& rows, std::size_t width) {
+    const std::vector<std::size_t> widths = columnWidths(rows);
+    const std::optional<std::vector<std::size_t>> fitting = fittedWidths(widths, width);
+    // Two columns may have no headings, and a block would be no narrower.
+    if (!fitting && widths.size() > 2) return printBlocks(out, rows);
+    const bool isWrapped = fitting && *fitting != widths;
+    for (const Row& row : rows) {
+        if (isWrapped)
+            printWrapped(out, row, *fitting);
+        else
+            printLine(out, row, widths);
     }
 }
 
@@ -117,18 +129,14 @@ void printTable(std::ostream& out, const Rows& rows) {
 }
 
 void printTable(std::ostream& out, const Rows& rows, std::size_t width) {
-    const Rows shown = disarmed(rows);
-    const std::vector<std::size_t> widths = columnWidths(shown);
-    const std::optional<std::vector<std::size_t>> fitting = fittedWidths(widths, width);
-    // Two columns may have no headings, and a block would be no narrower.
-    if (!fitting && widths.size() > 2) return printBlocks(out, shown);
-    const bool isWrapped = fitting && *fitting != widths;
-    for (const Row& row : shown) {
-        if (isWrapped)
-            printWrapped(out, row, *fitting);
-        else
-            printLine(out, row, widths);
-    }
+    Rows shown = disarmed(rows);
+    for (Cell& heading : shown.front())
+        heading.look = Look::Heading;
+    printFitted(out, shown, width);
+}
+
+void printPairs(std::ostream& out, const Rows& rows) {
+    printFitted(out, disarmed(rows), widthOf(out));
 }
 
 std::string displayText(const core::CimValue& value) {

@@ -6,6 +6,7 @@
 #include <string>
 #include <vector>
 
+#include "Cli/Display/Colour.h"
 #include "Framework/Requests/CimOperations.h"
 
 /// Results, as text for a person and as JSON for a script.
@@ -21,13 +22,27 @@ void printJson(std::ostream& out, const Json& document);
 /// The same on a line, without its end.
 std::string jsonLine(const Json& document);
 
+/// What stands in a row of a table.
+struct Cell {
+    Cell(std::string words, Look how = Look::Plain) : text(std::move(words)), look(how) {}
+    Cell(const char* words, Look how = Look::Plain) : text(words), look(how) {}
+
+    std::string text;
+    Look look;
+};
+using Row = std::vector<Cell>;
+using Rows = std::vector<Row>;
+
 /// Prints rows with each column as wide as its widest cell; control characters in cells are made visible. On
-/// a terminal the table is made to fit its width; nothing is left out.
-void printTable(std::ostream& out, const std::vector<std::vector<std::string>>& rows);
+/// a terminal the table is made to fit its width; nothing is left out. The first row has the headings.
+void printTable(std::ostream& out, const Rows& rows);
 
 /// The same in at most `width` columns where that can be: long cells go on below, and where there are too
 /// many columns for that, each row becomes a block of lines with the headings of the first row.
-void printTable(std::ostream& out, const std::vector<std::vector<std::string>>& rows, std::size_t width);
+void printTable(std::ostream& out, const Rows& rows, std::size_t width);
+
+/// The same for rows of two columns that need no headings.
+void printPairs(std::ostream& out, const Rows& rows);
 
 /// The value as one line for a person: strings in quotes, arrays in braces, "NULL".
 std::string displayText(const core::CimValue& value);

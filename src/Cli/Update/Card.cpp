@@ -70,7 +70,7 @@ Json cardJson(const ma::CardUse& card) {
 }
 
 void printCard(std::ostream& out, const ma::CardUse& card) {
-    std::vector<std::vector<std::string>> rows;
+    Rows rows;
     const auto add = [&rows](const char* what, const std::vector<std::string>& names) {
         if (!names.empty()) rows.push_back({std::string("  ") + what, joined(names)});
     };
@@ -79,7 +79,7 @@ void printCard(std::ostream& out, const ma::CardUse& card) {
     add("bonds", card.bonds);
     add("bridges", card.bridges);
     if (!rows.empty()) out << "On this card:\n";
-    printTable(out, rows);
+    printPairs(out, rows);
 }
 
 ma::Activation activateFirmware(const std::string& adapter, bool mayDisrupt) {

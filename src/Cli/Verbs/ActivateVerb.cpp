@@ -67,10 +67,14 @@ ExitStatus print(Context& context, const Adapter& adapter, const ma::CardUse& ca
                                 {"card", cardJson(card)}});
         return why.status;
     }
-    const bool isFailure = why.status != ExitStatus::Done && why.status != ExitStatus::AlreadyCurrent;
-    std::ostream& stream = isFailure ? context.error : context.out;
-    stream << (isFailure ? "quenxctl: " : "") << printable(why.message) << '\n';
-    if (!why.advice.empty()) stream << printable(why.advice) << '\n';
+    const bool isDone = why.status == ExitStatus::Done;
+    if (!isDone && why.status != ExitStatus::AlreadyCurrent) {
+        printFailure(context.error, why.message, why.advice);
+        return why.status;
+    }
+    context.out << coloured(context.out, isDone ? Look::Success : Look::Plain, printable(why.message))
+                << '\n';
+    printHint(context.out, why.advice);
     return why.status;
 }
 

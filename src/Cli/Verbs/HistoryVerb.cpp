@@ -83,13 +83,16 @@ std::string imageText(const Record& record) {
 }
 
 void printRecords(std::ostream& out, const std::vector<Record>& records) {
-    std::vector<std::vector<std::string>> rows{
-        {"ID", "TIME", "ADAPTER", "OUTCOME", "USER", "THROUGH", "IMAGE", "DETAILS"}};
+    Rows rows{{"ID", "TIME", "ADAPTER", "OUTCOME", "USER", "THROUGH", "IMAGE", "DETAILS"}};
     const auto orDash = [](const std::string& text) { return text.empty() ? "-" : text; };
     for (const Record& record : records) {
-        rows.push_back({std::to_string(record.id), localTimeText(record.begun),
-                        orDash(labelOf(record.adapter, record.backend)), outcomeText(record),
-                        orDash(userText(record)), orDash(record.front), orDash(imageText(record)),
+        rows.push_back({std::to_string(record.id),
+                        localTimeText(record.begun),
+                        orDash(labelOf(record.adapter, record.backend)),
+                        {outcomeText(record), record.isFailure() ? Look::Failure : Look::Plain},
+                        orDash(userText(record)),
+                        orDash(record.front),
+                        orDash(imageText(record)),
                         detailsOf(record)});
     }
     printTable(out, rows);

@@ -26,11 +26,15 @@ std::string orDash(const std::string& text) {
 void printJobs(std::ostream& out, const std::vector<JobView>& jobs) {
     const bool hasUsers =
         std::any_of(jobs.begin(), jobs.end(), [](const JobView& job) { return !job.user.empty(); });
-    std::vector<std::vector<std::string>> rows = {{"JOB", "ADAPTER", "STATE", "PERCENT", "START"}};
+    Rows rows = {{"JOB", "ADAPTER", "STATE", "PERCENT", "START"}};
     for (const JobView& job : jobs) {
         const std::optional<unsigned> percent = job.certainPercent();
-        rows.push_back({job.id, orDash(labelOf(job.adapter, job.backend)), job.stateName(),
-                        percent ? std::to_string(*percent) : "-", momentText(job.start)});
+        rows.push_back(
+            {job.id,
+             orDash(labelOf(job.adapter, job.backend)),
+             {job.stateName(), job.hasEnded() && !job.hasSucceeded() ? Look::Failure : Look::Plain},
+             percent ? std::to_string(*percent) : "-",
+             momentText(job.start)});
     }
     for (std::size_t i = 0; i < rows.size(); ++i) {
         if (hasUsers) rows[i].push_back(i == 0 ? "USER" : orDash(jobs[i - 1].user));

@@ -52,9 +52,10 @@ void printAsJson(std::ostream& out, const ManyResults& results) {
 }
 
 void printSummary(std::ostream& out, const ManyResults& results) {
-    std::vector<std::vector<std::string>> rows = {{"ADAPTER", "OUTCOME", "FIRMWARE"}};
+    Rows rows = {{"ADAPTER", "OUTCOME", "FIRMWARE"}};
     for (const Outcome& outcome : results.outcomes)
-        rows.push_back({outcome.label, outcomeText(outcome.ending),
+        rows.push_back({outcome.label,
+                        {outcomeText(outcome.ending), lookOf(outcome.ending)},
                         outcome.after.empty() ? "?" : componentsText(outcome.after)});
     for (const SameCard& function : results.sameCard)
         rows.push_back({labelOf(function.adapter), "same card as " + function.target,

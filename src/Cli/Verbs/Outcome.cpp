@@ -11,20 +11,21 @@ namespace cli {
 
 namespace {
 
-/// The words of the endings. Scripts know both: "result" is the older one.
+/// The words of the endings and their colour. Scripts know both words: "result" is the older one.
 struct EndingWords {
     Ending ending;
     const char* outcome;
     const char* result;
+    Look look;
 };
 constexpr EndingWords kEndings[] = {
-    {Ending::Current, "current", "already current"},
-    {Ending::Updated, "updated", "updated"},
-    {Ending::UpdatedResetPending, "updated-reset-pending", "updated"},
-    {Ending::Refused, "refused", "refused"},
-    {Ending::Failed, "failed", "failed"},
-    {Ending::Unknown, "unknown", "unknown"},
-    {Ending::Installable, "installable", "installable"},
+    {Ending::Current, "current", "already current", Look::Plain},
+    {Ending::Updated, "updated", "updated", Look::Success},
+    {Ending::UpdatedResetPending, "updated-reset-pending", "updated", Look::Success},
+    {Ending::Refused, "refused", "refused", Look::Failure},
+    {Ending::Failed, "failed", "failed", Look::Failure},
+    {Ending::Unknown, "unknown", "unknown", Look::Failure},
+    {Ending::Installable, "installable", "installable", Look::Success},
 };
 
 const EndingWords& wordsOf(Ending ending) {
@@ -45,6 +46,10 @@ std::string changeText(const Component* before, const Component* after) {
 
 const char* outcomeText(Ending ending) {
     return wordsOf(ending).outcome;
+}
+
+Look lookOf(Ending ending) {
+    return wordsOf(ending).look;
 }
 
 Outcome::Outcome(const Candidate& candidate)
@@ -89,7 +94,7 @@ void to_json(Json& json, const Outcome& outcome) {
 }
 
 void printChange(std::ostream& out, const Outcome& outcome) {
-    std::vector<std::vector<std::string>> rows;
+    Rows rows;
     for (const Component& component : outcome.after) {
         rows.push_back(
             {"  " + component.type, changeText(findComponent(outcome.before, component.type), &component)});
@@ -98,7 +103,7 @@ void printChange(std::ostream& out, const Outcome& outcome) {
         if (outcome.after.empty() || findComponent(outcome.after, component.type) != nullptr) continue;
         rows.push_back({"  " + component.type, changeText(&component, nullptr)});
     }
-    printTable(out, rows);
+    printPairs(out, rows);
 }
 
 void printUnchecked(std::ostream& out, const Outcome& outcome) {
@@ -109,11 +114,14 @@ void printUnchecked(std::ostream& out, const Outcome& outcome) {
 
 void printText(Context& context, const Outcome& outcome) {
     std::ostream& stream = outcome.isFailure() ? context.error : context.out;
-    stream << (outcome.isFailure() ? "quenxctl: " : "") << printable(outcome.message) << '\n';
+    if (outcome.isFailure())
+        printFailure(stream, outcome.message, {});
+    else
+        stream << coloured(stream, lookOf(outcome.ending), printable(outcome.message)) << '\n';
     // After a failure the explanation says what the adapter has now.
     if (outcome.isUpdated()) printChange(stream, outcome);
     if (outcome.ending == Ending::Installable) printUnchecked(stream, outcome);
-    if (!outcome.advice.empty()) stream << printable(outcome.advice) << '\n';
+    printHint(stream, outcome.advice);
 }
 
 }  // namespace cli

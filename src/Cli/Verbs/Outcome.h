@@ -6,6 +6,7 @@
 #include <string>
 #include <vector>
 
+#include "Cli/Display/Colour.h"
 #include "Cli/Update/Candidate.h"
 #include "Cli/Update/Jobs.h"
 #include "Cli/Verbs/Verbs.h"
@@ -19,6 +20,8 @@ enum class Ending { Current, Updated, UpdatedResetPending, Refused, Failed, Unkn
 
 /// The word of an ending in tables and in the JSON member "outcome".
 const char* outcomeText(Ending ending);
+/// How that word looks on a terminal.
+Look lookOf(Ending ending);
 
 /// What follows a sentence on an image that is trusted by a key; nothing without one.
 inline std::string trustText(const std::string& key) {

@@ -112,7 +112,7 @@ ExitStatus showPending(Context& context, std::vector<Adapter> adapters) {
         printJson(context.out, {{"adapters", adapters}, {"silent", silent}});
         return status;
     }
-    std::vector<std::vector<std::string>> rows = {{"NAME", "BACKEND", "RESET", "FIRMWARE"}};
+    Rows rows = {{"NAME", "BACKEND", "RESET", "FIRMWARE"}};
     for (const Adapter& adapter : adapters)
         rows.push_back(
             {adapter.name, adapter.backend, adapter.resetNeeded, componentsText(adapter.components)});
@@ -132,12 +132,10 @@ namespace {
 void printAdapters(Context& context, const std::vector<Adapter>& adapters) {
     if (adapters.empty()) {
         context.out << "There are no adapters.\n";
-        const std::string advice = adviceForNoAdapters(context.connection);
-        if (!advice.empty()) context.out << printable(advice) << '\n';
+        printHint(context.out, adviceForNoAdapters(context.connection));
         return;
     }
-    std::vector<std::vector<std::string>> rows = {
-        {"NAME", "BACKEND", "PCI", "IDS", "UPDATABLE", "FIRMWARE", "DESCRIPTION"}};
+    Rows rows = {{"NAME", "BACKEND", "PCI", "IDS", "UPDATABLE", "FIRMWARE", "DESCRIPTION"}};
     for (const Adapter& adapter : adapters) {
         const std::string firmware = isFirmwareUnknown(adapter)   ? "?"
                                      : adapter.components.empty() ? "-"
@@ -149,16 +147,14 @@ void printAdapters(Context& context, const std::vector<Adapter>& adapters) {
     printTable(context.out, rows);
     tellWriters(context, adapters);
     // Why that is so is the next question.
-    if (std::ranges::none_of(adapters, &Adapter::updatable)) {
-        const std::string advice = adviceForNoAdapters(context.connection);
-        if (!advice.empty()) context.out << printable(advice) << '\n';
-    }
+    if (std::ranges::none_of(adapters, &Adapter::updatable))
+        printHint(context.out, adviceForNoAdapters(context.connection));
     tellSilentOnes(context, silentOnes(adapters));
 }
 
 /// The first steps, with the name of an adapter for which they work.
-std::vector<std::vector<std::string>> nextSteps(const std::vector<Adapter>& adapters) {
-    std::vector<std::vector<std::string>> steps;
+Rows nextSteps(const std::vector<Adapter>& adapters) {
+    Rows steps;
     const auto free = std::ranges::find_if(
         adapters, [](const Adapter& adapter) { return adapter.updatable && !adapter.busy; });
     if (free != adapters.end()) {
@@ -190,7 +186,7 @@ ExitStatus showOverview(Context& context, const VerbOptions&) {
     const std::vector<Adapter> adapters = readAdapters(*context.connection.operations);
     printAdapters(context, adapters);
     context.out << "\nWhat you can do next:\n";
-    printTable(context.out, nextSteps(adapters));
+    printPairs(context.out, nextSteps(adapters));
     return ExitStatus::Done;
 }
 
@@ -238,7 +234,7 @@ ExitStatus showIdentities(Context& context, const VerbOptions&) {
         printJson(context.out, {{"identities", identities}});
         return ExitStatus::Done;
     }
-    std::vector<std::vector<std::string>> rows = {{"ID", "VERSION", "TYPES", "WHERE"}};
+    Rows rows = {{"ID", "VERSION", "TYPES", "WHERE"}};
     if (!trust.empty()) rows.front().emplace_back("TRUST");
     for (const InventoryItem& item : items) {
         rows.push_back({item.id, item.version, joined(item.types, ","),

@@ -93,7 +93,7 @@ std::vector<history::Record> recordsOf(const Connection& connection) try {
 }
 
 void printStatus(std::ostream& out, const std::vector<AdapterStatus>& all) {
-    std::vector<std::vector<std::string>> rows = {{"ADAPTER", "HELD BY", "SINCE", "JOB", "LAST OUTCOME"}};
+    Rows rows = {{"ADAPTER", "HELD BY", "SINCE", "JOB", "LAST OUTCOME"}};
     for (const AdapterStatus& each : all)
         rows.push_back({labelOf(each.adapter.name, each.adapter.backend), each.holder(), each.since(),
                         each.progress(), each.outcome()});
