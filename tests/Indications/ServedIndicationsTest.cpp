@@ -45,6 +45,7 @@ TEST(ServedIndicationsTest, TellOneUpdateExactlyToWhoSubscribedAsCommonClientsDo
     for (const std::string& body : listener.waitFor(all.size()))
         EXPECT_EQ(test::faultsOf(body), "");
     EXPECT_EQ(all.front().className + all.front().state, "CIM_InstCreation2");
+    EXPECT_THAT(all.front().context, ::testing::MatchesRegex("quenx-cimd#[0-9]+#1"));
     std::string states;
     for (const Told& each : all) {
         EXPECT_EQ(each.number, &each - all.data());
