@@ -101,7 +101,7 @@ old="$(cat "$root/run/daemon.pid")"
 inside env QUENX_UPGRADE_WAIT=3 QUENX_BACKEND=simulator apt-get -o DPkg::Path="$path" install -y --no-install-recommends \
     $(cd "$root" && ls packages/*.deb | sed 's|^|/|') >build/deb/upgrade.log 2>&1 || { cat build/deb/upgrade.log; fail "the upgrade failed"; }
 grep '^quenx-cimd:' build/deb/upgrade.log
-grep -q 'Waiting for .* Adapter: .*eth2' build/deb/upgrade.log || fail "the upgrade does not name the adapter"
+grep -q 'Waiting for the update of eth2 ' build/deb/upgrade.log || fail "the upgrade does not name the adapter"
 grep -q 'keeps running' build/deb/upgrade.log || fail "the upgrade does not say that it left the daemon alone"
 kill -0 "$local_update" || fail "the local update ended before the upgrade did, so nothing was shown"
 [ -d "/proc/$old" ] || fail "the old daemon ended before the upgrade did, so nothing was shown"

@@ -3,7 +3,6 @@
 
 #include <dlfcn.h>
 
-#include <algorithm>
 #include <new>
 
 #include "Cmpi/Listening.h"
@@ -46,18 +45,8 @@ std::unique_ptr<core::ProviderSession> openSession() {
 }
 
 /// By the standard's class, so that instances of any provider count; none where no provider serves it.
-std::vector<core::CimPath> instancesOf(core::CimOperations& operations, const char* className) {
-    if (operations.getClass(className).empty()) return {};
-    return operations.enumerateInstanceNames(className);
-}
-
-bool isAdapterClaimed(core::CimOperations& operations) {
-    const core::RequestScope scope;
-    auto services = instancesOf(operations, "CIM_SoftwareInstallationService");
-    return std::ranges::any_of(services, [](core::CimPath& service) {
-        const update::ImageCheck* check = update::findImageCheck(service);
-        return check != nullptr && !check->claimedAdapter().empty();
-    });
+bool hasInstances(core::CimOperations& operations, const char* className) {
+    return !operations.getClass(className).empty() && !operations.enumerateInstanceNames(className).empty();
 }
 
 /// The end of the process; that of the library where no session is open.
@@ -101,7 +90,7 @@ bool Front::isBusy() noexcept try {
     if (m_session == nullptr) return false;
     if (Listening::theOne().isBusy()) return true;
     core::CimOperations& operations = *m_session->operations();
-    return !instancesOf(operations, "CIM_ConcreteJob").empty() || isAdapterClaimed(operations) ||
+    return hasInstances(operations, "CIM_ConcreteJob") || !update::claimedAdapter(operations).empty() ||
            core::isReaperBusy();
 } catch (...) {
     // Whoever cannot look stays.

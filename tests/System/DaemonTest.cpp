@@ -86,9 +86,9 @@ TEST(DaemonTest, LetsAFlashEndBeforeItStops) {
         ASSERT_TRUE(reaches(daemon, job, "4"));
         if (isDeleted) daemon.lines("di", job);
         daemon.program().send(SIGTERM);
-        ASSERT_TRUE(
-            daemon.program().waitFor(isDeleted ? "Waiting for an update whose job was deleted."
-                                               : "Waiting for the update of Quenx:FirmwareUpdate@Job#1 at "));
+        ASSERT_TRUE(daemon.program().waitFor(
+            isDeleted ? "Waiting for the update of eth0, whose job was deleted."
+                      : "Waiting for the update of eth0 (Quenx:FirmwareUpdate@Job#1 at "));
         // What means nothing here must not end a flash.
         for (const int signal : {SIGUSR1, SIGUSR2, SIGALRM, SIGHUP})
             daemon.program().send(signal);

@@ -16,6 +16,7 @@
 #include "Host/Operations/InteropNamespace.h"
 #include "Host/Server/ServerCertificate.h"
 #include "MidAPI/ma.h"
+#include "Providers/Schema/ProviderInterfaces.h"
 #include "Providers/Schema/ValueMaps.h"
 #include "Utils/Os/Linux/OwnFiles.h"
 #include "Utils/Os/Linux/linux.h"
@@ -265,8 +266,10 @@ std::string Daemon::unfinished() {
     // From here on no request can start an update, so there can only be fewer of them.
     m_dispatcher->shutDown();
     const std::string updates = runningUpdates(*m_session.operations());
-    if (!updates.empty()) return "the update of " + updates;
-    return core::isReaperBusy() ? "an update whose job was deleted" : "";
+    if (updates.empty() && !core::isReaperBusy()) return "";
+    const std::string adapter = update::claimedAdapter(*m_session.operations());
+    const std::string update = adapter.empty() ? "an update" : "the update of " + adapter;
+    return update + (updates.empty() ? ", whose job was deleted" : " (" + updates + ")");
 }
 
 }  // namespace host

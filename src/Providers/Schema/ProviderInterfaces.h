@@ -12,8 +12,9 @@
 #include "Utils/Time.h"
 
 namespace core {
+class CimOperations;
 class CimPath;
-}
+}  // namespace core
 
 // What instances can do for other providers and for a front in the same process, beside what clients see. Who
 // needs them finds an instance through the broker and asks it by dynamic_cast from core::CimInstance; no
@@ -120,5 +121,8 @@ class QUENX_EXPORT ImageCheck {
 /// The image check of the service that the path names, where it has one; null otherwise. Good until the
 /// calling thread's request scope ends.
 QUENX_EXPORT ImageCheck* findImageCheck(core::CimPath& service);
+
+/// The adapter that is claimed in this process; empty for none, or where nobody serves updates.
+QUENX_EXPORT std::string claimedAdapter(core::CimOperations& operations);
 
 }  // namespace update
