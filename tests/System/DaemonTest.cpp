@@ -269,8 +269,9 @@ TEST_P(DaemonSessionTest, ShowsWhatIsWrittenDown) {
 }
 
 INSTANTIATE_TEST_SUITE_P(Shell, DaemonSessionTest,
-                         ::testing::Values("Held", "Interop", "Listen", "Remote", "RemotePolicy", "SameModel",
-                                           "SecondDaemon", "ServedHistory", "TwoFronts", "Update"),
+                         ::testing::Values("Completion", "Held", "Interop", "Listen", "Remote",
+                                           "RemotePolicy", "SameModel", "SecondDaemon", "ServedHistory",
+                                           "TwoFronts", "Update"),
                          [](const auto& session) { return std::string(session.param); });
 
 }  // namespace
