@@ -14,6 +14,7 @@
 #include "Host/Server/HttpServer.h"
 #include "Host/Server/LocalSocket.h"
 #include "Host/Server/ServerCertificate.h"
+#include "Host/Server/TlsPriorities.h"
 #include "Host/UnixSocket.h"
 #include "Support/TempFolder.h"
 #include "Support/Together.h"
@@ -102,6 +103,14 @@ TEST(ServerCertificateTest, IsRenewedOnlyIfMadeByAnUnsetClock) {
     EXPECT_EQ(warning(), "");
     fs::remove(files.key);
     EXPECT_THROW(host::makeTlsFiles(files), std::runtime_error) << "for the certificate that is there";
+}
+
+TEST(TlsPrioritiesTest, AreRefusedWhereTheLibraryDoesNotKnowThem) {
+    EXPECT_NO_THROW(host::requireTlsPriorities(host::tlsPriorities()));
+    EXPECT_THAT([] { host::requireTlsPriorities("NORMAL:+VERS-TLS9.9:-RSA"); },
+                ThrowsMessage<std::runtime_error>(HasSubstr("does not take from \"+VERS-TLS9.9:-RSA\" on")));
+    EXPECT_THAT([] { host::requireTlsPriorities("@QUENX-TEST"); },
+                ThrowsMessage<std::runtime_error>(HasSubstr("Define them in the section [priorities] of /")));
 }
 
 TEST(SpoolTest, RemovesWhatAKilledDaemonHasLeftOfAnUpload) {

@@ -14,6 +14,7 @@
 #include "Host/Daemon/Daemon.h"
 #include "Host/Server/LocalSocket.h"
 #include "Host/Server/ServerCertificate.h"
+#include "Host/Server/TlsPriorities.h"
 #include "MidAPI/ma.h"
 #include "Utils/Os/Linux/PolicyFile.h"
 #include "Utils/Os/Linux/linux.h"
@@ -81,6 +82,7 @@ void checkSocket(const std::string& path) {
 }
 
 void checkTls(const TlsSettings& settings) {
+    requireTlsPriorities(tlsPriorities());
     if (!areTlsFilesToBeMade(settings) && !isCertificateToBeRenewed(settings)) {
         warn(ServerCertificate(settings.certificate, settings.key).warning());
         return;

@@ -14,15 +14,12 @@
 #include "Host/Server/LocalSocket.h"
 #include "Host/Server/ServerCertificate.h"
 #include "Host/Server/SessionTickets.h"
+#include "Host/Server/TlsPriorities.h"
 #include "Utils/Log.h"
 
 namespace host {
 
 namespace {
-
-// The older versions of TLS are out of use (RFC 8996). Without the key exchange RSA: whoever came by the key
-// later could read all that was recorded before.
-constexpr const char* kTlsPriorities = "NORMAL:-VERS-ALL:+VERS-TLS1.3:+VERS-TLS1.2:-RSA";
 
 /// What the function below shows; old ones live as long as their server.
 std::atomic<const ServerCertificate*> currentCertificate{nullptr};
@@ -152,8 +149,9 @@ MHD_Daemon* HttpServer::library(bool tls) {
         {MHD_OPTION_STRICT_FOR_CLIENT, 1, nullptr}};
     // Certificate and key by a function, not by their text, so that SIGHUP can put others in their place.
     if (tls) {
+        requireTlsPriorities(tlsPriorities());  // the library's complaint is for its log alone
         options.push_back({MHD_OPTION_HTTPS_CERT_CALLBACK, 0, reinterpret_cast<void*>(&retrieveCertificate)});
-        options.push_back({MHD_OPTION_HTTPS_PRIORITIES, 0, const_cast<char*>(kTlsPriorities)});
+        options.push_back({MHD_OPTION_HTTPS_PRIORITIES, 0, const_cast<char*>(tlsPriorities())});
     }
     options.push_back({MHD_OPTION_END, 0, nullptr});
     library = ::MHD_start_daemon(tls ? kFlags | MHD_USE_TLS : kFlags, 0, nullptr, nullptr,
