@@ -37,6 +37,13 @@ function(quenx_test name)
     gtest_discover_tests(${name} DISCOVERY_TIMEOUT 60 PROPERTIES TIMEOUT 120)
 endfunction()
 
+# quenx_fips_test(PROGRAM FILTER): some of its tests once more, as one CTest test, in the FIPS mode of GnuTLS
+function(quenx_fips_test program filter)
+    # The mode is chosen while the library loads, so a test cannot enter it.
+    add_test(NAME ${program}.WorksInFipsMode COMMAND FipsMode $<TARGET_FILE:${program}> --gtest_filter=${filter})
+    set_tests_properties(${program}.WorksInFipsMode PROPERTIES ENVIRONMENT "GNUTLS_FORCE_FIPS_MODE=1" TIMEOUT 120)
+endfunction()
+
 # quenx_replaces_allocation(TARGET): a program with an operator new of its own
 function(quenx_replaces_allocation target)
     # Clang's thread sanitizer links an operator new into what it takes for C++, and then there are two.
