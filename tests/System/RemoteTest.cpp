@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 // quenxctl --server: the same verbs over CIM-XML, against a real quenx-cimd.
 #include <gtest/gtest.h>
+#include <netinet/in.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
@@ -11,6 +12,7 @@
 #include "System/Quenxctl.h"
 #include "System/RawConnection.h"
 #include "System/RunningDaemon.h"
+#include "Utils/Os/Linux/linux.h"
 
 namespace {
 
@@ -44,6 +46,30 @@ bool handles(const Program& program, int signal) {
         std::this_thread::sleep_for(std::chrono::milliseconds(20));
     }
     return false;
+}
+
+bool hasIpv6Loopback() {
+    const os::Descriptor socket(::socket(AF_INET6, SOCK_STREAM | SOCK_CLOEXEC, 0));
+    sockaddr_in6 address{};
+    address.sin6_family = AF_INET6;
+    address.sin6_addr = in6addr_loopback;
+    return ::bind(socket.number(), reinterpret_cast<const sockaddr*>(&address), sizeof address) == 0;
+}
+
+TEST(Ipv6Test, LogsInAndInstallsOverTls) {
+    if (!hasIpv6Loopback()) GTEST_SKIP() << "this machine has no IPv6 loopback";
+    const test::RunningDaemon daemon({"--listen-address", "::1"});
+    const auto quenxctl = [&daemon](const std::string& options, const std::string& password) {
+        const std::string server = "--server https://[::1]:" + std::to_string(daemon.httpsPort());
+        return test::run(test::withWordsOf(server + " --user admin " + options, daemon.image(), {QUENXCTL}),
+                         {"QUENXCTL_PASSWORD=" + password});
+    };
+    const std::string trusted = "--cacert " + (daemon.folder() / "cert.pem") + " ";
+    EXPECT_THAT(quenxctl("adapters", "admin").error, ::testing::HasSubstr("certificate"));
+    EXPECT_THAT(quenxctl(trusted + "adapters", "wrong").error, ::testing::HasSubstr("password"));
+    const ProgramResult installed = quenxctl(trusted + kInstall, "admin");
+    EXPECT_EQ(installed.status, 0) << installed.error;
+    EXPECT_THAT(installed.out, ::testing::HasSubstr("eth0 (simulated) was updated."));
 }
 
 TEST_F(RemoteTest, LeavesAnUpdateToTheServerWhenInterrupted) {

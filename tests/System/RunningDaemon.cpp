@@ -44,11 +44,15 @@ RunningDaemon::RunningDaemon(const std::vector<std::string>& options,
     command.insert(command.end(), options.begin(), options.end());
     m_program = std::make_unique<Program>(command, Program::Output::Terminal, environment);
     EXPECT_TRUE(m_program->waitFor("Serving http")) << "the daemon does not start: " << m_program->seen();
-    const auto portBehind = [&](const std::string& scheme) {
-        return std::stoi(m_program->seen().substr(m_program->seen().find(scheme) + scheme.size()));
+    const std::string served = m_program->seen().substr(m_program->seen().find("Serving http"));
+    const auto portOf = [&served](const std::string& scheme) {
+        const std::string rest = served.substr(served.find(scheme) + scheme.size());
+        const std::string authority = rest.substr(0, rest.find_first_of(" \r"));
+        // Behind the last colon: an IPv6 address has some of its own.
+        return std::stoi(authority.substr(authority.rfind(':') + 1));
     };
-    m_httpsPort = portBehind("https://127.0.0.1:");
-    m_httpPort = portBehind(" http://127.0.0.1:");
+    m_httpsPort = portOf("https://");
+    m_httpPort = portOf(" http://");
 }
 
 void RunningDaemon::setPassword(const std::string& name, const std::string& option) const {
