@@ -14,6 +14,7 @@ HERE = pathlib.Path(__file__).resolve().parent
 PAGE = HERE.parent / "architecture.md"
 PICTURE = HERE / "architecture.svg"
 WIDTH, LABEL, BAND, GAP, BOX, MARGIN = 960, 130, 92, 26, 12, 16
+CHARACTER = 6.1  # wide, of most fonts
 COLOURS = ("#dbeafe", "#e0e7ff", "#ede9fe", "#dcfce7", "#fef9c3", "#ffedd5", "#fee2e2", "#e5e7eb")
 STYLE = ("text{fill:#111827} .layer{font-weight:600;font-size:14px} .part{font-weight:600;font-size:14px}"
          " .where{font-size:12px;fill:#4b5563} .what{font-size:12px}"
@@ -48,6 +49,8 @@ def drawn(bands):
                           'fill="#ffffff" stroke="#9ca3af"/>')
             centre = x + (width - BOX) / 2
             for line, (kind, words) in enumerate((("part", part), ("where", where), ("what", what))):
+                if len(words) * CHARACTER > width - BOX:
+                    sys.exit(f"{PAGE.name}: this is too long for its box: {words}")
                 shapes.append(text(kind, centre, top + BOX + 20 + 19 * line, words))
         if number > 0 and not name.startswith("for "):
             middle = left + (WIDTH - MARGIN - left - BOX) / 2

@@ -9,6 +9,7 @@
 #include "Framework/Classes/CimBroker.h"
 #include "Framework/Classes/InstanceList.h"
 #include "Framework/Model/CimError.h"
+#include "Logind/InhibitingLocker.h"
 #include "Providers/Schema/ProviderInterfaces.h"
 #include "Utils/Log.h"
 #include "Utils/Os/Linux/linux.h"
@@ -31,6 +32,8 @@ std::unique_ptr<core::ProviderSession> openSession() {
     auto session = std::make_unique<core::ProviderSession>("");
     // Object managers give a call up after 40 seconds: 5 are more for the whole file, 15 for the adapter.
     utils::SMASHv2Config::getInstance()->setDefaultImageReadTimeout(std::chrono::seconds(20));
+    logind::loadLibrary();
+    session->workUnder(std::make_unique<logind::InhibitingLocker>("Quenx providers"));
     if (const std::string problem = session->loadHistory(); !problem.empty())
         utils::writeAuditLog("[history] No record is kept of updates: " + utils::escapeForLog(problem, 400));
     session->tellEvents(Listening::theOne().sink());

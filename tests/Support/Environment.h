@@ -30,7 +30,8 @@ class ChosenEnvironment {
             {"LC_ALL", "C.UTF-8"},
             {"QUENX_BACKEND", ma::kSimulatorBackend},
             {"QUENX_ADAPTERS", m_home.write("adapters.toml", "")},
-            {"QUENXCTL_SOCKET", m_home / "socket"}};
+            {"QUENXCTL_SOCKET", m_home / "socket"},
+            {"DBUS_SYSTEM_BUS_ADDRESS", "unix:path=" + m_home / "no-bus"}};
         for (const char* kept : {"TMPDIR", "ASAN_OPTIONS", "LSAN_OPTIONS", "TSAN_OPTIONS", "UBSAN_OPTIONS",
                                  "ASAN_SYMBOLIZER_PATH", "GCOV_PREFIX", "GCOV_PREFIX_STRIP"}) {
             if (const char* value = std::getenv(kept)) chosen.emplace(kept, value);

@@ -17,6 +17,7 @@
 #include "Framework/Requests/DeniedUpdates.h"
 #include "Framework/Requests/ProviderSession.h"
 #include "History/Log/LogAgent.h"
+#include "Logind/InhibitingLocker.h"
 #include "MidAPI/ma.h"
 #include "Utils/Os/Linux/linux.h"
 
@@ -141,6 +142,7 @@ Connection openProviders(const ProviderSettings& settings) {
     core::ProviderSession* const session = &local->session;
     // The adapters first: providers may ask for them as soon as they are loaded.
     selectAdapters(settings.adapters);
+    session->workUnder(std::make_unique<logind::InhibitingLocker>("quenxctl"));
     const auto history = history::History::wanted();
     const auto refusals = std::make_shared<RefusalSink>(history);
     session->keepHistory(refusals);

@@ -4,6 +4,7 @@
 #include <memory>
 #include <optional>
 #include <string>
+#include <utility>
 #include <vector>
 
 #include "Framework/Events/EventSink.h"
@@ -88,6 +89,10 @@ class QUENX_EXPORT ProviderSession {
     ProviderSession(const ProviderSession&) = delete;
     ProviderSession& operator=(const ProviderSession&) = delete;
 
+    /// Has the providers work on adapters under this locker, in place of a plain one. To be called before
+    /// they are loaded, once.
+    void workUnder(std::unique_ptr<os::OSLocker> locker) { m_chosenLocker = std::move(locker); }
+
     /// Has the providers tell this sink of updates. To be called before they are loaded, once; without it
     /// they tell nobody.
     void keepHistory(std::shared_ptr<UpdateSink> sink) { m_history.emplace(std::move(sink)); }
@@ -119,6 +124,7 @@ class QUENX_EXPORT ProviderSession {
     std::optional<utils::SMASHv2Config> m_configuration;
     utils::PolicyFile m_policy;
     os::OSLockerLinux m_locker;
+    std::unique_ptr<os::OSLocker> m_chosenLocker;  ///< hides the other one; see utils::Singleton
     LoadedVerifier m_verifier;
     const InstalledVerifier m_installedVerifier{m_verifier};
     std::optional<InstalledSink> m_history;

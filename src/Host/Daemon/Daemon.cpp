@@ -15,6 +15,7 @@
 #include "Host/Operations/Dispatcher.h"
 #include "Host/Operations/InteropNamespace.h"
 #include "Host/Server/ServerCertificate.h"
+#include "Logind/InhibitingLocker.h"
 #include "MidAPI/ma.h"
 #include "Providers/Schema/ProviderInterfaces.h"
 #include "Providers/Schema/ValueMaps.h"
@@ -123,6 +124,9 @@ Daemon::Daemon(const Settings& settings)
         reportProblem("Warning: " + text);
     // Before the providers come, which ask for the adapters as soon as they are called.
     selectAdapters(m_settings);
+    // Now, and not with the first update: until then an upgrade may have exchanged what it would load.
+    logind::loadLibrary();
+    m_session.workUnder(std::make_unique<logind::InhibitingLocker>("quenx-cimd"));
     m_session.keepHistory(m_history);
     m_session.tellEvents(m_events);
     // Whoever died in an update cannot tell any more how it ended.

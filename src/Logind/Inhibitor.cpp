@@ -1,0 +1,135 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "Logind/Inhibitor.h"
+
+#include <dlfcn.h>
+#include <fcntl.h>
+#include <systemd/sd-bus.h>
+#include <unistd.h>
+
+#include <chrono>
+#include <cstring>
+#include <memory>
+
+#include "Utils/Os/Linux/linux.h"
+
+namespace logind {
+
+namespace {
+
+using Clock = std::chrono::steady_clock;
+using Microseconds = std::chrono::microseconds;
+
+constexpr auto kPatience = std::chrono::seconds(1);  // for the bus, and once more for logind
+
+/// The functions of libsystemd, which is not there on every machine.
+struct Library {
+    decltype(&::sd_bus_open_system) open = nullptr;
+    decltype(&::sd_bus_close_unref) close = nullptr;
+    decltype(&::sd_bus_is_ready) isReady = nullptr;
+    decltype(&::sd_bus_process) process = nullptr;
+    decltype(&::sd_bus_wait) wait = nullptr;
+    decltype(&::sd_bus_set_method_call_timeout) setTimeout = nullptr;
+    decltype(&::sd_bus_call_method) call = nullptr;
+    decltype(&::sd_bus_message_read) read = nullptr;
+    decltype(&::sd_bus_message_unref) endMessage = nullptr;
+    decltype(&::sd_bus_error_free) endError = nullptr;
+    std::string problem;
+};
+
+Library load() {
+    // Its binary interface; the headers that this is compiled with are the same one's.
+    constexpr const char* kFile = "libsystemd.so.0";
+    Library found;
+    void* const library = ::dlopen(kFile, RTLD_NOW | RTLD_LOCAL | RTLD_NODELETE);
+    const auto find = [&]<class Function>(const char* name, Function& function) {
+        if (library != nullptr) function = reinterpret_cast<Function>(::dlsym(library, name));
+        if (function != nullptr || !found.problem.empty()) return;
+        const char* const why = ::dlerror();
+        found.problem = why == nullptr ? name : why;
+    };
+    find("sd_bus_open_system", found.open);
+    find("sd_bus_close_unref", found.close);
+    find("sd_bus_is_ready", found.isReady);
+    find("sd_bus_process", found.process);
+    find("sd_bus_wait", found.wait);
+    find("sd_bus_set_method_call_timeout", found.setTimeout);
+    find("sd_bus_call_method", found.call);
+    find("sd_bus_message_read", found.read);
+    find("sd_bus_message_unref", found.endMessage);
+    find("sd_bus_error_free", found.endError);
+    return found;
+}
+
+/// Where the library looks for it, too.
+bool isThereABus() {
+    return os::getEnvVariable("DBUS_SYSTEM_BUS_ADDRESS") != nullptr ||
+           ::access("/run/dbus/system_bus_socket", F_OK) == 0;
+}
+
+const Library& library() {
+    static const Library kLibrary = load();
+    return kLibrary;
+}
+
+std::string errorText(int result) {
+    return std::strerror(-result);
+}
+
+/// Logs in to the bus. The library would do so with the first call, and wait for ever for a bus that says
+/// nothing. Negative where it fails.
+int becomeReady(sd_bus* bus) {
+    for (const auto end = Clock::now() + kPatience;;) {
+        const int ready = library().isReady(bus);
+        if (ready != 0) return ready;
+        const int done = library().process(bus, nullptr);
+        if (done < 0) return done;
+        const auto left = std::chrono::duration_cast<Microseconds>(end - Clock::now());
+        if (left <= Microseconds::zero()) return -ETIMEDOUT;
+        if (done == 0) library().wait(bus, static_cast<std::uint64_t>(left.count()));
+    }
+}
+
+/// A descriptor that is the lock, or why there is none.
+int inhibit(sd_bus* bus, const std::string& who, const std::string& why, std::string& problem) {
+    const Library& systemd = library();
+    sd_bus_error error = SD_BUS_ERROR_NULL;
+    sd_bus_message* reply = nullptr;
+    systemd.setTimeout(bus, Microseconds(kPatience).count());
+    int result = systemd.call(bus, "org.freedesktop.login1", "/org/freedesktop/login1",
+                              "org.freedesktop.login1.Manager", "Inhibit", &error, &reply, "ssss",
+                              "shutdown:sleep", who.c_str(), why.c_str(), "block");
+    int passed = -1;
+    if (result >= 0) result = systemd.read(reply, "h", &passed);
+    // That of the message ends with it.
+    const int lock = result < 0 ? -1 : ::fcntl(passed, F_DUPFD_CLOEXEC, 3);
+    if (lock < 0)
+        problem = error.message != nullptr ? error.message : errorText(result < 0 ? result : -errno);
+    systemd.endMessage(reply);
+    systemd.endError(&error);
+    return lock;
+}
+
+}  // namespace
+
+std::string loadLibrary() {
+    return isThereABus() ? library().problem : "there is no system bus";
+}
+
+Inhibitor::Inhibitor(const std::string& who, const std::string& why) : m_problem(loadLibrary()) {
+    if (!m_problem.empty()) return;
+    sd_bus* bus = nullptr;
+    int result = library().open(&bus);
+    const std::unique_ptr<sd_bus, decltype(&::sd_bus_close_unref)> closed(bus, library().close);
+    if (result >= 0) result = becomeReady(bus);
+    if (result < 0) {
+        m_problem = "the system's bus: " + errorText(result);
+    } else {
+        m_lock = inhibit(bus, who, why, m_problem);
+    }
+}
+
+Inhibitor::~Inhibitor() {
+    if (m_lock >= 0) ::close(m_lock);
+}
+
+}  // namespace logind

@@ -1,0 +1,33 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include <string>
+
+namespace logind {
+
+/// Loads the library that talks to systemd-logind. Without this the first inhibitor does; a process whose
+/// files may be exchanged while it runs does so at its start. Stays loaded. Returns why it cannot be had;
+/// empty when it was.
+std::string loadLibrary();
+
+/// Keeps the machine from being shut down and from going to sleep, as long as it lives, where systemd-logind
+/// is there and lets this user (systemd's Inhibitor Lock interface, mode "block"). Where it is not, all goes
+/// on without: this waits two seconds at most, and throws nothing but for want of memory. The kernel ends it
+/// with the process. Used by one thread at a time.
+class Inhibitor {
+  public:
+    /// @param who,why  for people who ask what keeps their machine from shutting down
+    Inhibitor(const std::string& who, const std::string& why);
+    ~Inhibitor();
+    Inhibitor(const Inhibitor&) = delete;
+    Inhibitor& operator=(const Inhibitor&) = delete;
+
+    /// Why there is no lock; empty where there is one.
+    const std::string& problem() const { return m_problem; }
+
+  private:
+    int m_lock = -1;  ///< logind ends the lock when this is closed
+    std::string m_problem;
+};
+
+}  // namespace logind
