@@ -12,7 +12,7 @@ int main(int argc, char** argv) {
     std::printf(
         "gnutls_fips140_mode_enabled() is %u: what follows runs %s\n", mode,
         mode != 0 ? "in FIPS mode" : "without FIPS mode, since this GnuTLS has none or was not asked");
-    std::fflush(stdout);
+    static_cast<void>(std::fflush(stdout));
     if (argc > 1) ::execv(argv[1], argv + 1);
     std::perror(argc > 1 ? argv[1] : "no program is named");
     return 127;

@@ -7,8 +7,8 @@ namespace {
 
 /// A word of the stream itself, so that nothing has to be handed along to wherever something is printed.
 long& mayHaveColours(std::ostream& out) {
-    static const int index = std::ios_base::xalloc();
-    return out.iword(index);
+    static const int kIndex = std::ios_base::xalloc();
+    return out.iword(kIndex);
 }
 
 /// What switches it on (ECMA-48, 8.3.117). No more than the basic colours: which red is theirs, and whether
