@@ -8,7 +8,7 @@
 #   ./test.sh PRESET...       just these: release asan tsan x86-32 clang; fuzz, whose targets the build asan has;
 #                             elsewhere, the demo and the release tests as another user in an odd folder; kernel,
 #                             updates by the release build in a virtual machine with cards that the kernel flashes; and
-#                             packages, the Debian packages of the committed tree in a fresh root, which takes root
+#                             packages, those for Debian and those for RPM of the committed tree in a fresh root, as root
 #
 # CI=true in the environment means --ci. JOBS=N sets how many jobs run at once (default: one for each processor).
 set -euo pipefail
@@ -136,6 +136,8 @@ run_package_tests() {
     nice packaging/build-deb.sh --no-install
     echo "== packages: trying them in a fresh root"
     packaging/try-packages.sh
+    echo "== packages: RPM packages"
+    packaging/try-rpm.sh
     echo "== packages: the profiles that confine the daemon"
     packaging/check-confinement.sh
 }

@@ -1,7 +1,8 @@
 #!/usr/bin/env bash
 # SPDX-License-Identifier: Apache-2.0
-# Builds the RPM packages of the committed tree, into build/rpm. On a system that has no RPM packages of what building
-# takes, such as Debian, that is not asked for: whoever runs this has it from elsewhere.
+# Builds the RPM packages of the committed tree, into build/rpm; without a repository (in an archive of the sources) of
+# the folder as it is. On a system that has no RPM packages of what building takes, such as Debian, that is not asked
+# for: whoever runs this has it from elsewhere.
 #
 #   packaging/build-rpm.sh
 set -euo pipefail
@@ -12,7 +13,11 @@ version="$(sed -n 's/^project(Quenx VERSION \([0-9.]*\).*/\1/p' CMakeLists.txt)"
 result="$PWD/build/rpm"
 rm -rf "$result"
 mkdir -p "$result/SOURCES"
-git archive --prefix="quenx-$version/" HEAD | gzip -n >"$result/SOURCES/quenx-$version.tar.gz"
+if [ "$(git rev-parse --show-toplevel 2>/dev/null)" = "$PWD" ]; then
+    git archive --prefix="quenx-$version/" HEAD
+else
+    tar -c --exclude=./build --exclude=./.git --transform="s,^\\.,quenx-$version," .
+fi | gzip -n >"$result/SOURCES/quenx-$version.tar.gz"
 options=(--define "_topdir $result" --define "quenx_version $version")
 [ ! -f /etc/debian_version ] || options+=(--nodeps)
 rpmbuild -bb "${options[@]}" "$@" packaging/rpm/quenx.spec >"$result/log" 2>&1 ||
