@@ -92,7 +92,7 @@ int becomeReady(sd_bus* bus) {
 /// A descriptor that is the lock, or why there is none.
 int inhibit(sd_bus* bus, const std::string& who, const std::string& why, std::string& problem) {
     const Library& systemd = library();
-    sd_bus_error error = SD_BUS_ERROR_NULL;
+    sd_bus_error error{};
     sd_bus_message* reply = nullptr;
     systemd.setTimeout(bus, Microseconds(kPatience).count());
     int result = systemd.call(bus, "org.freedesktop.login1", "/org/freedesktop/login1",
