@@ -43,6 +43,13 @@ TEST_F(SafeListTest, IteratesOverWhatIsAddedAndAcrossAClear) {
     EXPECT_EQ(iterator.first(), &two);
 }
 
+TEST_F(SafeListTest, IteratesOverNoListAsOverAnEmptyOne) {
+    List::Iterator iterator(std::make_unique<List::SimpleIteratorImplementation>(nullptr));
+    EXPECT_EQ(iterator.size(), 0U);
+    EXPECT_EQ(iterator.first(), nullptr);
+    EXPECT_EQ(iterator.next(), nullptr);
+}
+
 TEST_F(SafeListTest, TransfersAnIteratorThatIsCopied) {
     const test::LogLevelGuard guard(1);
     list.add(&one);
