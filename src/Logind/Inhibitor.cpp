@@ -6,6 +6,7 @@
 #include <systemd/sd-bus.h>
 #include <unistd.h>
 
+#include <atomic>
 #include <chrono>
 #include <cstring>
 #include <memory>
@@ -66,9 +67,10 @@ bool isThereABus() {
            ::access("/run/dbus/system_bus_socket", F_OK) == 0;
 }
 
+std::atomic<const Library*> loaded{nullptr};
+
 const Library& library() {
-    static const Library kLibrary = load();
-    return kLibrary;
+    return *loaded.load();
 }
 
 std::string errorText(int result) {
@@ -112,11 +114,17 @@ int inhibit(sd_bus* bus, const std::string& who, const std::string& why, std::st
 }  // namespace
 
 std::string loadLibrary() {
-    return isThereABus() ? library().problem : "there is no system bus";
+    if (!isThereABus()) return "there is no system bus";
+    static const Library kLibrary = load();
+    if (kLibrary.problem.empty()) loaded.store(&kLibrary);
+    return kLibrary.problem;
 }
 
-Inhibitor::Inhibitor(const std::string& who, const std::string& why) : m_problem(loadLibrary()) {
-    if (!m_problem.empty()) return;
+Inhibitor::Inhibitor(const std::string& who, const std::string& why) {
+    if (loaded.load() == nullptr) {
+        m_problem = "the library that talks to the system's bus is not loaded";
+        return;
+    }
     sd_bus* bus = nullptr;
     int result = library().open(&bus);
     const std::unique_ptr<sd_bus, decltype(&::sd_bus_close_unref)> closed(bus, library().close);

@@ -5,9 +5,9 @@
 
 namespace logind {
 
-/// Loads the library that talks to systemd-logind. Without this the first inhibitor does; a process whose
-/// files may be exchanged while it runs does so at its start. Stays loaded. Returns why it cannot be had;
-/// empty when it was.
+/// Loads the library that talks to systemd-logind, where there is a system bus. It stays loaded. To be called
+/// before the first update begins: an inhibitor loads nothing, since the thread that has it may be one for
+/// whose end somebody waits who has the loader's lock. Returns why it cannot be had; empty when it was.
 std::string loadLibrary();
 
 /// Keeps the machine from being shut down and from going to sleep, as long as it lives, where systemd-logind

@@ -21,7 +21,10 @@ using ::testing::HasSubstr;
 /// This process finds that bus, as long as this lives.
 class OnTheBus {
   public:
-    explicit OnTheBus(const std::string& address) { ::setenv(kName, address.c_str(), 1); }
+    explicit OnTheBus(const std::string& address) {
+        ::setenv(kName, address.c_str(), 1);
+        EXPECT_EQ(logind::loadLibrary(), "");
+    }
     explicit OnTheBus(const StandIn& standIn)
         : OnTheBus(standIn.environment().substr(std::string(kName).size() + 1)) {}
     OnTheBus(const OnTheBus&) = delete;
@@ -49,6 +52,7 @@ TEST(InhibitorTest, HoldsUpAShutdownAsLongAsALockerIsHeld) {
 }
 
 TEST(InhibitorTest, GoesOnWithoutABusAndWithoutAnAnswer) {
+    EXPECT_THAT(logind::Inhibitor("me", "why").problem(), HasSubstr("is not loaded"));
     {
         const StandIn logind(StandIn::Manner::Refuses);
         const OnTheBus address(logind);

@@ -7,6 +7,7 @@
 #include "Framework/Classes/RequestScope.h"
 #include "Framework/Requests/Audit.h"
 #include "Framework/Requests/UpdateSink.h"
+#include "Logind/Inhibitor.h"
 #include "Providers/Schema/ProviderInterfaces.h"
 #include "Providers/Schema/ValueMaps.h"
 #include "Utils/Utils.h"
@@ -96,6 +97,7 @@ void auditOwn(const std::string& operation, const std::string& target, const std
 core::MethodResult startUpdate(const Connection& connection, const Candidate& candidate) {
     using core::CimType;
     using core::CimValue;
+    if (connection.isInProcess) logind::loadLibrary();
     // The method for an identity asks the inventory for its types.
     const bool isNamedById = candidate.identity.isValid();
     const InstallCodes options(candidate, isNamedById ? std::vector<std::string>() : candidate.types);
