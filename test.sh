@@ -127,7 +127,7 @@ run_fuzzers() {
 run_kernel_tests() {
     [ "$have_kernel" = true ] || return 0
     cmake --preset release >/dev/null
-    cmake --build --preset release -j "$jobs" --target quenxctl quenx-cimd Quenx_SoftwareUpdate Quenx_SoftwareInventory
+    cmake --build --preset release -j "$jobs" --target quenx_installed
     tests/kernel/run.sh
 }
 

@@ -18,6 +18,9 @@ if(NOT QUENX_X86_32)
 endif()
 install(TARGETS quenxctl DESTINATION bin)
 install(TARGETS quenx-cimd DESTINATION sbin)
+# To build no more than this.
+add_custom_target(quenx_installed)
+add_dependencies(quenx_installed ${quenx_libraries} Quenx_Cmpi Quenx_History Quenx_Trust quenxctl quenx-cimd)
 
 configure_file(packaging/quenx-cimd.service.in ${CMAKE_BINARY_DIR}/quenx-cimd.service @ONLY)
 install(FILES ${CMAKE_BINARY_DIR}/quenx-cimd.service DESTINATION lib/systemd/system)
