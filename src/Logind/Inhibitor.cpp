@@ -10,6 +10,7 @@
 #include <chrono>
 #include <cstring>
 #include <memory>
+#include <type_traits>
 
 #include "Utils/Os/Linux/linux.h"
 
@@ -42,7 +43,8 @@ Library load() {
     constexpr const char* kFile = "libsystemd.so.0";
     Library found;
     void* const library = ::dlopen(kFile, RTLD_NOW | RTLD_LOCAL | RTLD_NODELETE);
-    const auto find = [&]<class Function>(const char* name, Function& function) {
+    const auto find = [&](const char* name, auto& function) {
+        using Function = std::remove_reference_t<decltype(function)>;
         if (library != nullptr) function = reinterpret_cast<Function>(::dlsym(library, name));
         if (function != nullptr || !found.problem.empty()) return;
         const char* const why = ::dlerror();

@@ -70,7 +70,7 @@ struct ServiceCall {
     core::MethodResult run(const Connection& connection) const try {
         const core::NotedCall noted;
         try {
-            const core::MethodResult result = connection.operations->invokeMethod(service, method, arguments);
+            core::MethodResult result = connection.operations->invokeMethod(service, method, arguments);
             audit(connection, core::outcomeOf(result), noted);
             return result;
         } catch (const core::CimError& error) {
