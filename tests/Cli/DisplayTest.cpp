@@ -56,6 +56,14 @@ TEST(OutputTest, CutsAlignsAndDisarmsText) {
     EXPECT_EQ(out.str(), "A             B\nlong\\x0a\\x1b  x\ngröße         y\n              \n");
 }
 
+TEST(OutputTest, WrapsTextBetweenWords) {
+    using Lines = std::vector<std::string>;
+    EXPECT_EQ(cli::wrapped("fits as it is", 13), (Lines{"fits as it is"}));
+    EXPECT_EQ(cli::wrapped("  --name    says who it is", 20, 12),
+              (Lines{"  --name    says who", "            it is"}));
+    EXPECT_EQ(cli::wrapped("/a/path/without/end", 8), (Lines{"/a/path/", "without/", "end"}));
+}
+
 TEST(OutputTest, FitsATableToTheTerminal) {
     const cli::Rows rows = {{"NAME", "WHERE", "WHY"},
                             {"eth0", "/a/long/path/without/a/space", "größer than what is there"}};
@@ -72,12 +80,11 @@ TEST(OutputTest, FitsATableToTheTerminal) {
               "NAME  WHERE                        WHY\n"
               "eth0  /a/long/path/without/a/spac  größer than what is there\n"
               "      e\n");
-    EXPECT_EQ(printed(30),
-              "NAME  WHERE        WHY\n"
-              "eth0  /a/long/pat  größer than\n"
-              "      h/without/a  what is\n"
-              "      /space       there\n");
-    EXPECT_EQ(printed(27),
+    EXPECT_EQ(printed(36),
+              "NAME  WHERE           WHY\n"
+              "eth0  /a/long/path/w  größer than\n"
+              "      ithout/a/space  what is there\n");
+    EXPECT_EQ(printed(35),
               "NAME   eth0\n"
               "WHERE  /a/long/path/without/a/space\n"
               "WHY    größer than what is there\n")

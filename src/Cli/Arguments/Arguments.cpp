@@ -6,11 +6,13 @@
 #include <CLI/CLI.hpp>
 #include <algorithm>
 #include <iostream>
+#include <sstream>
 #include <string_view>
 #include <tuple>
 
 #include "Cli/Arguments/Completion.h"
 #include "Cli/Arguments/Parsing.h"
+#include "Cli/Display/Terminal.h"
 
 namespace cli {
 
@@ -102,6 +104,10 @@ void requireOneImage(const CLI::App& app, const Arguments& arguments) {
     const UpdateOptions& update = arguments.options.update;
     const bool takesImage = arguments.verb == install || arguments.verb == check;
     if (!takesImage || update.image.empty() != update.identity.empty()) return;
+    const std::string& pattern = arguments.options.many.match;
+    if (update.image.empty() && ::access(pattern.c_str(), F_OK) == 0)
+        throw CommandError(ExitStatus::WrongUse, "--match takes a pattern, and took " + pattern + " as one.",
+                           "Put the pattern before the image, such as --match 'eth*'.");
     throw CommandError(ExitStatus::WrongUse, "Name one image, either as a file or with --identity.",
                        askHelpOf(*app.get_subcommands().front()));
 }
@@ -143,11 +149,23 @@ void chooseServer(Arguments& arguments) {
     if (::access(localSocket().c_str(), W_OK) == 0) arguments.server.url.emplace("unix:");
 }
 
+/// Prints a help; on a terminal its descriptions go on below themselves.
+void printFitted(const std::string& help) {
+    constexpr std::size_t kNames = 30;  // columns, of the library's own making
+    const std::size_t width = widthOf(std::cout);
+    std::istringstream lines(help);
+    for (std::string line; std::getline(lines, line);) {
+        const bool isDescribed = line.starts_with("  ") && width >= 2 * kNames;
+        for (const std::string& each : wrapped(line, width, isDescribed ? kNames : 0))
+            std::cout << each << '\n';
+    }
+}
+
 /// Prints the help of the program, or with a name that of a verb.
 void printHelp(const CLI::App& app, const std::string& name) {
     // Not App::help(): once a verb was read, that gives the help of the verb.
     const auto print = [](const CLI::App& asked, const std::string& title) {
-        std::cout << asked.get_formatter()->make_help(&asked, title, CLI::AppFormatMode::Normal);
+        printFitted(asked.get_formatter()->make_help(&asked, title, CLI::AppFormatMode::Normal));
     };
     if (name.empty()) return print(app, app.get_name());
     for (const CLI::App* verb : verbsOf(app)) {
@@ -201,7 +219,9 @@ std::optional<Arguments> readArguments(int argc, char** argv) {
         app.parse(argc, argv);
     } catch (const CLI::ParseError& error) {
         if (error.get_exit_code() != 0) throw wrongUse(app, error);
-        app.exit(error);
+        std::ostringstream said;  // a help, or the version
+        app.exit(error, said, said);
+        printFitted(said.str());
         return std::nullopt;
     }
     if (help->parsed()) {

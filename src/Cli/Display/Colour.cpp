@@ -40,11 +40,18 @@ std::string coloured(std::ostream& out, Look look, std::string_view text) {
 }
 
 void printHint(std::ostream& out, const std::string& advice) {
-    if (!advice.empty()) out << coloured(out, Look::Hint, printable(advice)) << '\n';
+    if (advice.empty()) return;
+    for (const std::string& line : wrapped(printable(advice), widthOf(out)))
+        out << coloured(out, Look::Hint, line) << '\n';
 }
 
 void printFailure(std::ostream& out, const std::string& message, const std::string& advice) {
-    out << coloured(out, Look::Failure, "quenxctl:") << ' ' << printable(message) << '\n';
+    constexpr std::string_view kName = "quenxctl:";
+    std::vector<std::string> lines = wrapped(std::string(kName) + ' ' + printable(message), widthOf(out));
+    out << coloured(out, Look::Failure, kName);
+    lines.front().erase(0, kName.size());
+    for (const std::string& line : lines)
+        out << line << '\n';
     printHint(out, advice);
 }
 

@@ -52,7 +52,7 @@ std::vector<std::size_t> columnWidths(const Rows& rows) {
 /// The widest columns made narrower until all fit; nothing where they would become too narrow to read. The
 /// first column stays whole: it names the row, and people copy it.
 std::optional<std::vector<std::size_t>> fittedWidths(std::vector<std::size_t> widths, std::size_t width) {
-    constexpr std::size_t kNarrowest = 10;
+    constexpr std::size_t kNarrowest = 14;
     const auto total = [&] {
         return std::accumulate(widths.begin(), widths.end(), kGap * (widths.size() - 1));
     };

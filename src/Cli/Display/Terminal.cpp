@@ -106,8 +106,17 @@ std::string takeLine(std::string& text, std::size_t width) {
     return line;
 }
 
+std::vector<std::string> wrapped(std::string text, std::size_t width, std::size_t indent) {
+    std::vector<std::string> lines{takeLine(text, width)};
+    while (!text.empty())
+        lines.push_back(std::string(indent, ' ') + takeLine(text, width - indent));
+    return lines;
+}
+
 std::size_t widthOf(const std::ostream& out) {
-    const std::size_t columns = &out == &std::cout ? columnsOfTerminal(STDOUT_FILENO) : 0;
+    const std::size_t columns = &out == &std::cout   ? columnsOfTerminal(STDOUT_FILENO)
+                                : &out == &std::cerr ? columnsOfTerminal(STDERR_FILENO)
+                                                     : 0;
     return columns == 0 ? std::numeric_limits<std::size_t>::max() : columns;
 }
 

@@ -7,6 +7,7 @@
 #include <ostream>
 #include <string>
 #include <string_view>
+#include <vector>
 
 namespace cli {
 
@@ -25,8 +26,12 @@ std::string elideMiddle(std::string_view text, std::size_t width);
 /// is cut anywhere. @param width  at least 1
 std::string takeLine(std::string& text, std::size_t width);
 
+/// The text on as many lines as `width` columns take; the further ones begin `indent` columns in.
+/// @param indent  less than the width
+std::vector<std::string> wrapped(std::string text, std::size_t width, std::size_t indent = 0);
+
 /// The columns of the terminal that the stream writes to; no limit for a pipe or a file, for another stream
-/// than standard output, and where the terminal does not say.
+/// than standard output and standard error, and where the terminal does not say.
 std::size_t widthOf(const std::ostream& out);
 
 /// What a file descriptor can show: asked once, when the program starts.

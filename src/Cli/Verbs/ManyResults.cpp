@@ -53,10 +53,12 @@ void printAsJson(std::ostream& out, const ManyResults& results) {
 
 void printSummary(std::ostream& out, const ManyResults& results) {
     Rows rows = {{"ADAPTER", "OUTCOME", "FIRMWARE"}};
-    for (const Outcome& outcome : results.outcomes)
+    for (const Outcome& outcome : results.outcomes) {
+        const std::string would = outcome.ending == Ending::Installable ? "would have " : "";
         rows.push_back({outcome.label,
                         {outcomeText(outcome.ending), lookOf(outcome.ending)},
-                        outcome.after.empty() ? "?" : componentsText(outcome.after)});
+                        outcome.after.empty() ? "?" : would + componentsText(outcome.after)});
+    }
     for (const SameCard& function : results.sameCard)
         rows.push_back({labelOf(function.adapter), "same card as " + function.target,
                         componentsText(function.adapter.components)});
