@@ -4,11 +4,11 @@
 #
 #   ./test.sh                 the default build and the one with the address and undefined-behaviour sanitizers
 #   ./test.sh --ci            these, 32-bit x86, the thread sanitizer, 10 s of each fuzz target, elsewhere and kernel
-#   ./test.sh --nightly       kernel, packages and 32-bit x86: what CI may leave to the night where time is short
-#   ./test.sh PRESET...       just these: release asan tsan x86-32 clang; fuzz, whose targets the build asan has;
+#   ./test.sh --nightly       kernel, packages and 32-bit x86, with sanitizers too: what CI may leave to the night
+#   ./test.sh PRESET...       just these: release asan tsan x86-32 x86-32-asan clang; fuzz, whose targets asan has;
 #                             elsewhere, the demo and the release tests as another user in an odd folder; kernel,
 #                             updates by the release build in a virtual machine with cards that the kernel flashes; and
-#                             packages, those for Debian and those for RPM of the committed tree in a fresh root, as root
+#                             packages, those for Debian and RPM of the committed tree in a fresh root, as root
 #
 # CI=true in the environment means --ci. JOBS=N sets how many jobs run at once (default: one for each processor).
 set -euo pipefail
@@ -18,13 +18,13 @@ jobs="${JOBS:-$(nproc)}"
 fuzz_seconds="${FUZZ_SECONDS:-10}"
 groups=(build run test)
 fuzz_build=build/asan
-all_presets=(release asan x86-32 tsan fuzz elsewhere kernel packages clang)
+all_presets=(release asan x86-32 x86-32-asan tsan fuzz elsewhere kernel packages clang)
 presets=()
 
 for argument in "$@"; do
     case "$argument" in
         --ci) CI=true ;;
-        --nightly) presets+=(kernel packages x86-32) ;;
+        --nightly) presets+=(kernel packages x86-32 x86-32-asan) ;;
         -h | --help)
             sed -n '3,14s/^# \{0,1\}//p' "$0"
             exit 0
@@ -48,7 +48,7 @@ if [ "${#presets[@]}" = 0 ]; then
     presets=(release asan)
     [ "${CI:-}" = true ] && presets+=(x86-32 tsan fuzz elsewhere kernel)
 fi
-case " ${presets[*]} " in *" x86-32 "*) groups+=(x86-32) ;; esac
+case " ${presets[*]} " in *" x86-32"*) groups+=(x86-32) ;; esac
 case " ${presets[*]} " in *" packages "*) groups+=(deb) ;; esac
 
 packaging/install-packages.sh "${groups[@]}"
