@@ -100,9 +100,7 @@ TEST_F(InstallTest, FollowsAnotherProcess) {
 }
 
 TEST_F(InstallTest, TellsAnOrdinaryUserWhatOnlyRootMaySee) {
-    if (::geteuid() != 0) GTEST_SKIP() << "needs root, to become another user";
-    if (test::run(test::asNobody({QUENXCTL, "--version"})).status != 0)
-        GTEST_SKIP() << "other users do not get into the folder of the build";
+    if (const std::string why = test::whyNotNobody(); !why.empty()) GTEST_SKIP() << why;
     EXPECT_EQ(quenxctl("install --target eth0 IMAGE").status, 0);
     std::filesystem::permissions(m_folder.path(), std::filesystem::perms(0755));
     const ProgramResult listed = test::run(test::asNobody(command("adapters")));

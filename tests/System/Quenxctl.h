@@ -30,6 +30,13 @@ inline std::vector<std::string> asNobody(std::vector<std::string> command) {
     return command;
 }
 
+/// Why this test cannot be another user; empty where it can.
+inline std::string whyNotNobody() {
+    if (::geteuid() != 0) return "needs root, to become another user";
+    const bool isReached = run(asNobody({QUENXCTL, "--version"})).status == 0;
+    return isReached ? "" : "other users do not get into the folder of the build";
+}
+
 /// quenxctl on simulated adapters of its own, those of SimulatedAdapters.h.
 class Quenxctl : public ::testing::Test {
   protected:

@@ -158,7 +158,7 @@ TEST_F(LocalServerTest, IsThereForRootWhenTheNetworkIsFull) {
 }
 
 TEST_F(LocalServerTest, KeepsOthersOutEvenIfFolderAndModeWereOpen) {
-    if (::geteuid() != 0) GTEST_SKIP() << "only root can become somebody else";
+    if (const std::string why = test::whyNotNobody(); !why.empty()) GTEST_SKIP() << why;
     const auto expectForNobody = [&](const std::string& reason) {
         const test::ProgramResult result = test::run(test::asNobody(command("jobs --server unix:")));
         EXPECT_TRUE(contains(result.error, reason)) << result.error;
