@@ -81,11 +81,17 @@ void finish(Record& record, std::uint64_t since) {
 /// child inherits, would not know that it holds none.
 struct History::Process {
     explicit Process(const Settings& settings)
-        : keeper(std::make_shared<Keeper>(settings)), writer([held = keeper] { return held->watch(); }) {}
+        : keeper(std::make_shared<Keeper>(settings)),
+          writer([held = keeper] { return held->watch(); }, [held = keeper] { held->addRefused(); }) {}
     Process(const Process&) = delete;
     Process& operator=(const Process&) = delete;
     ~Process() {
-        writer.run([held = keeper] { held->sync(); }, {});
+        writer.run(
+            [held = keeper] {
+                held->addRefused();
+                held->sync();
+            },
+            {});
     }
 
     const pid_t id = ::getpid();
@@ -190,8 +196,12 @@ void History::refused(const core::UpdateAttempt& attempt, unsigned int returnVal
     if (returnValue != 0) record.returnValue = returnValue;
     finish(record, attempt.monotonic);
     Process& own = process();
-    own.keeper->refused(std::move(record), attempt.mostRecords);
-    own.writer.run([keeper = own.keeper] { keeper->addRefused(); }, kPatience);
+    // Nobody waits for it: the answer says what was refused, and the audit trail has it at once. Whoever
+    // refuses faster than the disk takes records waits for the disk.
+    if (own.keeper->refused(std::move(record), attempt.mostRecords))
+        own.writer.run([keeper = own.keeper] { keeper->addRefused(); }, kPatience);
+    else
+        own.writer.gather();
 } catch (const std::exception&) {
     // Without memory there is no record; the other reason has been told.
 }

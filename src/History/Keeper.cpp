@@ -23,6 +23,7 @@ namespace {
 constexpr std::chrono::seconds kLockPatience{30};
 
 constexpr std::size_t kMostRefused = 1000;  // while the disk does not answer
+constexpr std::size_t kManyRefused = 200;
 
 std::int64_t now() {
     return static_cast<std::int64_t>(os::getuSecondsSinceEpoch());
@@ -144,10 +145,11 @@ void Keeper::insert(Store& store, std::span<Record> records, std::int64_t most) 
              "removed records " + std::to_string(pruned.first) + " to " + std::to_string(pruned.last)});
 }
 
-void Keeper::refused(Record record, std::int64_t most) {
+bool Keeper::refused(Record record, std::int64_t most) {
     const utils::Mutex::AutoLocker lock(m_refusedMutex);
     m_mostRecords = most;
     if (m_refused.size() < kMostRefused) m_refused.push_back(std::move(record));
+    return m_refused.size() >= kManyRefused;
 }
 
 void Keeper::addRefused() {
@@ -178,6 +180,7 @@ void Keeper::sync() {
 }
 
 bool Keeper::begin(const std::shared_ptr<RunningUpdate>& update) {
+    addRefused();
     Record& record = update->record;
     if (const auto look = lookAt(record.adapter)) {
         identify(record, *look);
@@ -283,6 +286,7 @@ void Keeper::look() {
 }
 
 std::int64_t Keeper::count() {
+    addRefused();
     std::int64_t records = 0;
     if (isThere() && !withStore([&](Store& store) { records = store.count(); }))
         throw HistoryError(m_problem);
@@ -290,6 +294,7 @@ std::int64_t Keeper::count() {
 }
 
 std::vector<Record> Keeper::find(const Filter& filter) {
+    addRefused();
     std::vector<Record> records;
     if (!isThere()) return records;
     const bool isDone = withStore([&](Store& store) {

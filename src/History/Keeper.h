@@ -30,13 +30,14 @@ class Keeper {
 
     /// Takes the record of an attempt that came to nothing, for addRefused(). For any thread.
     /// @param most  how many records are kept
-    void refused(Record record, std::int64_t most);
+    /// @return whether so many are waiting that the caller should wait for them, too
+    bool refused(Record record, std::int64_t most);
     /// Writes the records that refused() has taken. Any process reads them then, and they outlive this one;
     /// they are on the medium after the next sync(), or the next change that does not wait for that.
     void addRefused();
     /// Brings to the medium what is not there yet.
     void sync();
-    /// False when the record could not be written.
+    /// Writes after those that refused() has taken. False when the record could not be written.
     bool begin(const std::shared_ptr<RunningUpdate>& update);
     /// The update did not begin after all, since its record came too late: it gets one as a refusal.
     void withdraw(const std::shared_ptr<RunningUpdate>& update);
@@ -51,7 +52,8 @@ class Keeper {
     /// Notes the progress of the updates of this process, and does a sync(); false when there was nothing to
     /// do.
     bool watch();
-    /// The same as look(), and then the records. Makes no file where there is none.
+    /// The same as look(), and then the records, those that refused() has taken included. Makes no file where
+    /// there is none.
     /// Throws HistoryError.
     std::vector<Record> find(const Filter& filter);
     /// How many there are. Throws HistoryError.

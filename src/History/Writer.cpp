@@ -1,10 +1,12 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "History/Writer.h"
 
+#include <algorithm>
 #include <condition_variable>
 #include <cstdint>
 #include <deque>
 #include <mutex>
+#include <optional>
 #include <thread>
 
 #include "Utils/Log.h"
@@ -19,15 +21,19 @@ using Clock = std::chrono::steady_clock;
 constexpr std::size_t kMostTasks = 1000;
 constexpr std::chrono::seconds kPatienceAtEnd{10};
 constexpr std::chrono::seconds kSecond{1};
+// One change of the file costs about the same for one record and for many.
+constexpr std::chrono::milliseconds kGathering{20};
 
 }  // namespace
 
 /// Shared with the thread, which may outlive the object.
 struct Writer::State {
     std::function<bool()> perSecond;
+    Task gathered;
     std::mutex mutex;
     std::condition_variable changed;
     std::deque<Task> tasks;
+    std::optional<Clock::time_point> gatheredAt;  ///< when that is to run; none when nobody has asked
     std::uint64_t added = 0;
     std::uint64_t done = 0;
     bool isLate = false;  ///< somebody has waited in vain: until the tasks are done nobody waits again
@@ -35,8 +41,9 @@ struct Writer::State {
     bool hasEnded = false;
 };
 
-Writer::Writer(std::function<bool()> perSecond) : m_state(std::make_shared<State>()) {
+Writer::Writer(std::function<bool()> perSecond, Task gathered) : m_state(std::make_shared<State>()) {
     m_state->perSecond = std::move(perSecond);
+    m_state->gathered = std::move(gathered);
     const utils::SignalsBlocked blocked;
     std::thread([state = m_state] { work(state); }).detach();
 }
@@ -60,6 +67,13 @@ bool Writer::run(Task task, std::chrono::milliseconds patience) {
     return isDone;
 }
 
+void Writer::gather() {
+    const std::lock_guard lock(m_state->mutex);
+    if (m_state->gatheredAt) return;
+    m_state->gatheredAt = Clock::now() + kGathering;
+    m_state->changed.notify_all();
+}
+
 namespace {
 
 /// What comes out of a task, as when memory ends, must not end the process, which may write a flash now: its
@@ -74,38 +88,49 @@ bool guarded(const std::function<bool()>& step) noexcept try {
 }  // namespace
 
 void Writer::work(const std::shared_ptr<State>& state) {
-    bool isWatching = false;
-    Clock::time_point next = Clock::now();
+    constexpr auto kNever = Clock::time_point::max();
+    Clock::time_point watchAt = kNever;
     std::unique_lock lock(state->mutex);
-    while (true) {
-        const auto hasWork = [&] { return state->isStopping || !state->tasks.empty(); };
-        if (!isWatching) {
-            state->changed.wait(lock, hasWork);
-        } else if (!state->changed.wait_until(lock, next, hasWork) || Clock::now() >= next) {
-            // Also while there is always a task: refusals can come without end.
-            lock.unlock();
-            isWatching = guarded(state->perSecond);
-            next = Clock::now() + kSecond;
-            lock.lock();
-            continue;
-        }
-        if (state->tasks.empty()) break;
-        const Task task = std::move(state->tasks.front());
-        state->tasks.pop_front();
+    const auto perform = [&](const std::function<bool()>& step) {
         lock.unlock();
-        guarded([&] {
+        const bool result = guarded(step);
+        lock.lock();
+        return result;
+    };
+    const auto performTask = [&](const Task& task) {
+        perform([&] {
             task();
             return true;
         });
-        if (!isWatching) next = Clock::now() + kSecond;
-        isWatching = true;
-        lock.lock();
-        ++state->done;
-        if (state->tasks.empty()) state->isLate = false;
-        state->changed.notify_all();
+        watchAt = std::min(watchAt, Clock::now() + kSecond);
+    };
+    while (true) {
+        const Clock::time_point now = Clock::now();
+        const Clock::time_point gatherAt = state->gatheredAt.value_or(kNever);
+        if (watchAt <= now) {
+            // Also while there is always a task: refusals can come without end.
+            watchAt = perform(state->perSecond) ? Clock::now() + kSecond : kNever;
+        } else if (gatherAt <= now) {
+            state->gatheredAt.reset();
+            performTask(state->gathered);
+        } else if (!state->tasks.empty()) {
+            const Task task = std::move(state->tasks.front());
+            state->tasks.pop_front();
+            performTask(task);
+            ++state->done;
+            if (state->tasks.empty()) state->isLate = false;
+            state->changed.notify_all();
+        } else if (state->isStopping) {
+            break;
+        } else if (const auto next = std::min(watchAt, gatherAt); next == kNever) {
+            state->changed.wait(lock);
+        } else {
+            state->changed.wait_until(lock, next);
+        }
     }
-    // What it holds goes with the object, while somebody waits for that, and not with this thread.
+    // What they hold goes with the object, while somebody waits for that, and not with this thread.
     state->perSecond = nullptr;
+    state->gathered = nullptr;
     state->hasEnded = true;
     state->changed.notify_all();
 }

@@ -15,7 +15,8 @@ class Writer {
 
     /// @param perSecond  run about once a second while there is something to watch; says whether there still
     ///                   is
-    explicit Writer(std::function<bool()> perSecond);
+    /// @param gathered   run some time after gather()
+    Writer(std::function<bool()> perSecond, Task gathered);
     /// Waits for the tasks, but not for one that hangs: the thread is then left to itself, with what the
     /// tasks share.
     ~Writer();
@@ -26,6 +27,9 @@ class Writer {
     /// later all the same, unless too many have piled up behind one that hangs.
     /// @return whether it has ended
     bool run(Task task, std::chrono::milliseconds patience);
+    /// Runs what is gathered, once for all who ask within a few milliseconds. Waits for nothing. What is
+    /// asked for shortly before the end may not run any more.
+    void gather();
 
   private:
     struct State;

@@ -153,14 +153,17 @@ TEST_F(HistoryTest, ShowsRefusalsAtOnceAndSyncsManyTogether) {
                     history.refused(wrong, 5, core::ReasonId::ImageDamaged, adapter);
             });
     }
-    const std::vector<Record> found = records();
+    const std::vector<Record> found = history.find({});
     EXPECT_EQ(found.size(), 1 + 4 * kEach);
+    EXPECT_EQ(records().size(), found.size()) << "others do not see what this process sees";
     for (const Record& record : found)
         EXPECT_EQ(record.pciAddress, record.adapter == "eth0" ? "0000:03:00.0" : "") << record.reason;
     const int during = syncs;
     EXPECT_LT(during - before, 20);
 
     history.refused(attempt(), 5, core::ReasonId::ImageDamaged, "the last");
+    while (records().size() == found.size())
+        std::this_thread::sleep_for(std::chrono::milliseconds(1));
     const auto end = std::chrono::steady_clock::now() + std::chrono::seconds(10);
     while (syncs == during && std::chrono::steady_clock::now() < end)
         std::this_thread::sleep_for(std::chrono::milliseconds(20));
@@ -303,6 +306,7 @@ INSTANTIATE_TEST_SUITE_P(
 TEST_F(HistoryTest, KeepsAnUpdateWholeThatBeganWhileTheDiskWasFull) {
     History history(settings());
     history.refused(attempt(), 2, core::ReasonId::FileNotRead, "before");
+    EXPECT_EQ(history.count(), 1);
     rlimit limit{};
     ::getrlimit(RLIMIT_FSIZE, &limit);
     const rlimit full{0, limit.rlim_max};
