@@ -92,7 +92,7 @@ void stop(host::Daemon& daemon, const Signals& signals) {
 /// Each connection has a thread, and by default the C library keeps what was free for each of dozens of them:
 /// many times the budget of answers.
 void boundKeptMemory() {
-    constexpr int kArenas = 2;
+    constexpr int kArenas = 8;
     constexpr int kMappedAlone = 256 << 10;  // bytes, which go back to the system as soon as they are free
     ::mallopt(M_ARENA_MAX, kArenas);
     ::mallopt(M_MMAP_THRESHOLD, kMappedAlone);

@@ -82,30 +82,24 @@ PolicyFile::~PolicyFile() {
     newest = m_outer;
 }
 
-std::shared_ptr<const Policy> PolicyFile::current() {
-    const Mutex::AutoLocker lock(m_mutex);
-    try {
-        m_policy = read();
-        m_problem.clear();
-    } catch (const PolicyError& error) {
-        m_policy.reset();
-        if (m_problem != error.what()) {
-            m_problem = error.what();
-            QUENX_ERROR_TEXT("The policy cannot be obeyed, and nothing is installed or deleted: " +
-                             m_problem);
-        }
-        throw;
-    }
-    return m_policy;
-}
-
-std::shared_ptr<const Policy> PolicyFile::read() {
+std::shared_ptr<const Policy> PolicyFile::current() try {
+    // Nobody waits here for the disk while another reads: each obeys what he has read himself.
     std::optional<std::string> text = readSafely(m_path);
     if (!text && m_isNamed) refuse(m_path, "there is no such file; write it, or name another one");
-    if (m_policy != nullptr && text == m_text) return m_policy;
-    auto policy = std::make_shared<const Policy>(text ? parsePolicy(*text, m_path) : Policy());
-    m_text = std::move(text);
-    return policy;
+    const Mutex::AutoLocker lock(m_mutex);
+    if (m_policy == nullptr || text != m_text) {
+        m_policy = std::make_shared<const Policy>(text ? parsePolicy(*text, m_path) : Policy());
+        m_text = std::move(text);
+    }
+    m_problem.clear();
+    return m_policy;
+} catch (const PolicyError& error) {
+    const Mutex::AutoLocker lock(m_mutex);
+    if (m_problem != error.what()) {
+        m_problem = error.what();
+        QUENX_ERROR_TEXT("The policy cannot be obeyed, and nothing is installed or deleted: " + m_problem);
+    }
+    throw;
 }
 
 std::string PolicyFile::problem() try {

@@ -40,8 +40,6 @@ class QUENX_EXPORT PolicyFile {
     static bool isOnMachine() noexcept;
 
   private:
-    std::shared_ptr<const Policy> read() QUENX_REQUIRES(m_mutex);
-
     const std::string m_path;
     const bool m_isNamed;
     PolicyFile* const m_outer;
