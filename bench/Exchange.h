@@ -11,6 +11,7 @@
 #include "CimXml/Request.h"
 #include "Framework/Requests/CimRequests.h"
 #include "Host/Operations/Dispatcher.h"
+#include "Utils/Utils.h"
 
 namespace bench {
 
@@ -30,7 +31,7 @@ class Exchange {
     /// Not inlined: a profiler counts what is below it.
     __attribute__((noinline)) std::string answer(const std::string& message) {
         host::AnswerCharge charge = m_dispatcher.charge(kCaller.user);
-        return m_dispatcher.answer(cimxml::readRequest(message), kCaller, charge);
+        return utils::joined(m_dispatcher.answer(cimxml::readRequest(message), kCaller, charge), "");
     }
 
     /// Counts what one message costs, the first of its kind aside, which finds out once and for all what

@@ -82,7 +82,7 @@ const host::Caller kCaller{"root", true, "localhost", "127.0.0.1"};
 /// A front's part without its sockets. Not inlined: a profiler counts what is below it.
 __attribute__((noinline)) std::size_t exchange(host::Dispatcher& dispatcher, const std::string& message) {
     host::AnswerCharge charge = dispatcher.charge(kCaller.user);
-    return dispatcher.answer(cimxml::readRequest(message), kCaller, charge).size();
+    return cimxml::sizeOf(dispatcher.answer(cimxml::readRequest(message), kCaller, charge));
 }
 
 /// A request among ended jobs, as most are.

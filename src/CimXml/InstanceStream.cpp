@@ -81,34 +81,35 @@ std::size_t InstanceStream::take(const core::InstanceValue& instance) {
     return grown();
 }
 
-std::string InstanceStream::finish() {
+Pieces InstanceStream::finish() {
     begin();
     endResult(m_writer);
     m_told = 0;
-    return std::exchange(m_text, {});
+    m_inFullPieces = 0;
+    m_full.push_back(std::exchange(m_text, {}));
+    return std::exchange(m_full, {});
 }
 
 void InstanceStream::begin() {
     makeRoom();
-    if (m_text.empty()) startResult(m_writer, m_messageId, m_operation);
+    if (size() == 0) startResult(m_writer, m_messageId, m_operation);
 }
 
 void InstanceStream::makeRoom() {
     constexpr std::size_t kOneInstance = std::size_t{8} << 10;
-    constexpr std::size_t kFew = std::size_t{128} << 10;
-    constexpr std::size_t kMany = std::size_t{8} << 20;
+    // Small enough for the C library to keep: the system would clear each page of a larger one for each answer.
+    constexpr std::size_t kPiece = std::size_t{128} << 10;
     const std::size_t room = m_text.capacity();
     if (room - m_text.size() >= kOneInstance) return;
-    // A long answer is not copied again and again while it grows: the system gives large pieces page by page
-    // as they are written, so room to spare is no memory.
-    m_text.reserve(room < kOneInstance ? 2 * kOneInstance
-                   : room < kFew       ? kFew
-                   : room < kMany      ? kMany
-                                       : 2 * room);
+    if (room >= kPiece) {
+        m_inFullPieces += m_text.size();
+        m_full.push_back(std::exchange(m_text, {}));
+    }
+    m_text.reserve(room < kOneInstance ? 2 * kOneInstance : kPiece);
 }
 
 std::size_t InstanceStream::grown() {
-    return m_text.size() - std::exchange(m_told, m_text.size());
+    return size() - std::exchange(m_told, size());
 }
 
 }  // namespace cimxml

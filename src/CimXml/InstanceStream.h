@@ -29,13 +29,14 @@ class InstanceStream : public core::InstanceSink {
     std::size_t take(const core::InstanceValue& instance) override;
 
     /// The whole message; the stream is empty then.
-    std::string finish();
+    Pieces finish();
 
   private:
     const ShapeMarkup& markupOf(const core::CimInstance& instance);
     void writePath(const core::CimInstance& instance, const std::string& className,
                    const ShapeMarkup& markup);
     void writeProperty(const core::CimProperty& property, const ShapeMarkup& markup, std::size_t index);
+    std::size_t size() const { return m_inFullPieces + m_text.size(); }
     std::size_t grown();
     void begin();
     void makeRoom();
@@ -43,9 +44,11 @@ class InstanceStream : public core::InstanceSink {
     const std::string& m_messageId;
     const std::string& m_operation;
     bool m_hasPaths = true;
-    std::string m_text;
+    Pieces m_full;
+    std::size_t m_inFullPieces = 0;
+    std::string m_text;  ///< the piece that is being written
     XmlWriter m_writer{m_text};
-    std::size_t m_told = 0;  ///< of what the text takes
+    std::size_t m_told = 0;  ///< of what the message takes
     // Of the last instance: most answers hold those of one shape.
     const void* m_shape = nullptr;
     const ShapeMarkup* m_markup = nullptr;

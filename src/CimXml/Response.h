@@ -2,6 +2,7 @@
 #pragma once
 
 #include <array>
+#include <cstddef>
 #include <functional>
 #include <map>
 #include <memory>
@@ -85,6 +86,11 @@ struct Response {
 /// IRETURNVALUE tells no kind. Qualifier declarations and names of classes are passed over. Throws WireError
 /// for bytes that are no response. Thread-safe, no state.
 Response readResponse(std::string_view bytes);
+
+/// A message, or another body, in pieces that go out one after the other. What is written of a long one is not
+/// moved while it grows, and the memory of a piece soon serves another.
+using Pieces = std::vector<std::string>;
+std::size_t sizeOf(const Pieces& pieces);
 
 /// The response message, in the forms that the common clients read. Thread-safe, no state. The second lets go
 /// of each object once it is written, so that values and text are never both whole.

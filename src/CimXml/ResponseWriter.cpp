@@ -1,5 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 #include <concepts>
+#include <numeric>
 
 #include "CimXml/ElementCodec.h"
 #include "CimXml/Response.h"
@@ -194,6 +195,11 @@ std::size_t bytesOf(const IntrinsicResult& result) {
     for (const core::CimPath& path : result.paths)
         bytes += core::bytesOf(path);
     return bytes;
+}
+
+std::size_t sizeOf(const Pieces& pieces) {
+    return std::accumulate(pieces.begin(), pieces.end(), std::size_t{0},
+                           [](std::size_t sum, const std::string& piece) { return sum + piece.size(); });
 }
 
 }  // namespace cimxml

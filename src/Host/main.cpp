@@ -94,8 +94,10 @@ void stop(host::Daemon& daemon, const Signals& signals) {
 void boundKeptMemory() {
     constexpr int kArenas = 8;
     constexpr int kMappedAlone = 256 << 10;  // bytes, which go back to the system as soon as they are free
+    constexpr int kKeptFree = 4 << 20;       // for the pieces of the next answers, until AnswerBudget trims
     ::mallopt(M_ARENA_MAX, kArenas);
     ::mallopt(M_MMAP_THRESHOLD, kMappedAlone);
+    ::mallopt(M_TRIM_THRESHOLD, kKeptFree);
 }
 
 int run(const host::Settings& settings) {

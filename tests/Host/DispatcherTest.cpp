@@ -3,6 +3,7 @@
 
 #include "Host/DispatcherFixture.h"
 #include "Support/SyslogCapture.h"
+#include "Utils/Utils.h"
 
 namespace {
 
@@ -79,14 +80,14 @@ TEST_F(DispatcherTest, StreamsWhatItAnswers) {
     for (const auto& [operation, parameters] : table) {
         const cimxml::Request request{"<1>", cimxml::IntrinsicCall{operation, m_namespace, parameters}};
         host::AnswerCharge charge = m_dispatcher.charge(m_caller.user);
-        EXPECT_EQ(m_dispatcher.answer(request, m_caller, charge),
+        EXPECT_EQ(utils::joined(m_dispatcher.answer(request, m_caller, charge), ""),
                   cimxml::writeResponse(m_dispatcher.dispatch(request, m_caller, charge)));
     }
     for (unsigned int i = 0; i < 2000; ++i)
         m_agent.add("more", i);
     host::AnswerCharge charge = m_dispatcher.charge(m_caller.user);
     const cimxml::Request all{"1", cimxml::IntrinsicCall{"EnumerateInstances", m_namespace, table[0].second}};
-    const std::string text = m_dispatcher.answer(all, m_caller, charge);
+    const std::string text = utils::joined(m_dispatcher.answer(all, m_caller, charge), "");
     EXPECT_NE(text.find("<ERROR CODE=\"27\""), std::string::npos) << text.size();
 }
 

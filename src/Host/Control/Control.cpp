@@ -43,7 +43,7 @@ HttpAnswer controlAnswer(unsigned int status, const Json& body) {
     return {status,
             {{"Content-Type", "application/json"}, {control::kHeader, control::kVersion}},
             // Of a text that is not UTF-8 the odd bytes are replaced.
-            body.dump(-1, ' ', true, Json::error_handler_t::replace) + "\n"};
+            {body.dump(-1, ' ', true, Json::error_handler_t::replace) + "\n"}};
 }
 
 HttpAnswer controlAnswer(const std::exception& error) {

@@ -134,13 +134,14 @@ cimxml::Response Dispatcher::dispatch(const cimxml::Request& request, const Call
     return response;
 }
 
-std::string Dispatcher::answer(const cimxml::Request& request, const Caller& caller, AnswerCharge& charge) {
+cimxml::Pieces Dispatcher::answer(const cimxml::Request& request, const Caller& caller,
+                                  AnswerCharge& charge) {
     cimxml::InstanceStream stream(request.messageId, request.name());
     cimxml::Response response = dispatch(request, caller, charge, &stream);
     // What the stream holds of an enumeration that failed is not part of the answer.
     const auto* result = std::get_if<IntrinsicResult>(&response.content);
     if (result != nullptr && result->isStreamed) return stream.finish();
-    return cimxml::writeResponse(std::move(response), [&](std::size_t bytes) { charge.cover(bytes); });
+    return {cimxml::writeResponse(std::move(response), [&](std::size_t bytes) { charge.cover(bytes); })};
 }
 
 cimxml::Response Dispatcher::carryOut(const cimxml::Request& request, const Caller& caller,

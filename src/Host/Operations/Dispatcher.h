@@ -34,7 +34,7 @@ class Dispatcher {
                               cimxml::InstanceStream* stream = nullptr);
 
     /// The same as a message. Throws OverBudget.
-    std::string answer(const cimxml::Request& request, const Caller& caller, AnswerCharge& charge);
+    cimxml::Pieces answer(const cimxml::Request& request, const Caller& caller, AnswerCharge& charge);
 
     /// From now on every request is answered with "server is shutting down".
     void shutDown() { m_shuttingDown.store(true); }

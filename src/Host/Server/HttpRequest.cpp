@@ -106,8 +106,8 @@ HttpAnswer answerOf(AuthenticationOutcome outcome) {
 
 /// What the HTTP library owns, since it may send the body after our last function has returned.
 struct Body {
-    std::optional<AnswerCharge> charge;  // first: given back when the text has gone
-    std::string text;
+    std::optional<AnswerCharge> charge;  // first: given back when the pieces have gone
+    cimxml::Pieces pieces;
 };
 
 void freeBody(void* body) {
@@ -117,8 +117,12 @@ void freeBody(void* body) {
 /// The response takes the body over without copying it.
 MHD_Response* makeResponse(HttpAnswer& answer) {
     std::unique_ptr<Body> body(new Body{std::move(answer.charge), std::move(answer.body)});
-    MHD_Response* response = ::MHD_create_response_from_buffer_with_free_callback_cls(
-        body->text.size(), body->text.data(), freeBody, body.get());
+    std::vector<MHD_IoVec> places;
+    places.reserve(body->pieces.size());
+    for (const std::string& piece : body->pieces)
+        places.push_back({piece.data(), piece.size()});
+    MHD_Response* response = ::MHD_create_response_from_iovec(
+        places.data(), static_cast<unsigned int>(places.size()), freeBody, body.get());
     if (response != nullptr) static_cast<void>(body.release());
     return response;
 }
@@ -281,7 +285,7 @@ HttpAnswer HttpRequest::dispatch(AnswerCharge charge) {
             {{"Content-Type", "application/xml; charset=\"utf-8\""}, {"CIMOperation", "MethodResponse"}},
             m_server.m_dispatcher.answer(request, caller(), charge)};
         answer.tellReason(noted.notes().reason);
-        charge.set(answer.body.size());
+        charge.set(cimxml::sizeOf(answer.body));
         answer.charge.emplace(std::move(charge));
         return answer;
     } catch (const OverBudget&) {

@@ -11,6 +11,7 @@
 #include <vector>
 
 #include "CimXml/Request.h"
+#include "CimXml/Response.h"
 #include "CimXml/WireError.h"
 #include "Framework/Requests/Reasons.h"
 #include "Host/Authentication/PasswordChecker.h"
@@ -38,13 +39,13 @@ struct HttpHead {
 struct HttpAnswer {
     unsigned int status = 200;
     std::vector<std::pair<std::string, std::string>> headers;
-    std::string body;
+    cimxml::Pieces body = {};
     std::optional<AnswerCharge> charge = std::nullopt;  ///< of a large body
 
     /// Without a body, here and below.
-    static HttpAnswer plain(unsigned int status) { return {status, {}, ""}; }
+    static HttpAnswer plain(unsigned int status) { return {status, {}}; }
     static HttpAnswer withHeader(unsigned int status, std::string name, std::string value) {
-        return {status, {{std::move(name), std::move(value)}}, ""};
+        return {status, {{std::move(name), std::move(value)}}};
     }
     static HttpAnswer refusal(const cimxml::WireError& error);
 
