@@ -97,7 +97,8 @@ void InstanceStream::begin() {
 
 void InstanceStream::makeRoom() {
     constexpr std::size_t kOneInstance = std::size_t{8} << 10;
-    // Small enough for the C library to keep: the system would clear each page of a larger one for each answer.
+    // Small enough for the C library to keep: the system would clear each page of a larger one for each
+    // answer.
     constexpr std::size_t kPiece = std::size_t{128} << 10;
     const std::size_t room = m_text.capacity();
     if (room - m_text.size() >= kOneInstance) return;

@@ -87,8 +87,8 @@ struct Response {
 /// for bytes that are no response. Thread-safe, no state.
 Response readResponse(std::string_view bytes);
 
-/// A message, or another body, in pieces that go out one after the other. What is written of a long one is not
-/// moved while it grows, and the memory of a piece soon serves another.
+/// A message, or another body, in pieces that go out one after the other. What is written of a long one is
+/// not moved while it grows, and the memory of a piece soon serves another.
 using Pieces = std::vector<std::string>;
 std::size_t sizeOf(const Pieces& pieces);
 

@@ -172,6 +172,7 @@ std::shared_ptr<const CimPath> CimInstance::getPath() const {
 void CimInstance::forgetPath() const {
     const RecursiveLocker lock(m_mutex);
     m_path.reset();
+    m_hashOfKeys.reset();
     if (const auto list = m_list.lock()) list->keyChanged();
 }
 
@@ -232,10 +233,13 @@ std::size_t hashOfKey(const CimProperty& key) {
 
 std::size_t CimInstance::hashOfKeys() const {
     const RecursiveLocker lock(m_mutex);
-    const std::vector<std::size_t>& keys = keyIndices();
-    return std::accumulate(
-        keys.begin(), keys.end(), std::size_t{0},
-        [this](std::size_t sum, std::size_t key) { return sum + hashOfKey(*m_properties[key]); });
+    if (!m_hashOfKeys) {
+        const std::vector<std::size_t>& keys = keyIndices();
+        m_hashOfKeys = std::accumulate(
+            keys.begin(), keys.end(), std::size_t{0},
+            [this](std::size_t sum, std::size_t key) { return sum + hashOfKey(*m_properties[key]); });
+    }
+    return *m_hashOfKeys;
 }
 
 bool CimPath::isSameObjectAs(const CimInstance& instance) const {

@@ -6,6 +6,7 @@
 #include <cstdint>
 #include <memory>
 #include <mutex>
+#include <optional>
 #include <string>
 #include <string_view>
 #include <utility>
@@ -148,9 +149,12 @@ class QUENX_EXPORT CimInstance {
     /// When a key has changed.
     void forgetPath() const;
 
+    // What an enumeration asks of each instance stands together: among thousands nothing of it is in the
+    // processor's caches. The hash, the shape and the path are found at the first use.
+    std::atomic<bool> m_deleted{false};
     mutable RecursiveMutex m_mutex;
+    mutable std::optional<std::size_t> m_hashOfKeys QUENX_GUARDED_BY(m_mutex);
     std::vector<CimProperty*> m_properties;
-    // Both found at the first use.
     mutable std::shared_ptr<const Shape> m_shape QUENX_GUARDED_BY(m_mutex);
     mutable std::shared_ptr<const CimPath> m_path QUENX_GUARDED_BY(m_mutex);
     std::vector<std::pair<std::string, Method>> m_methods;
@@ -159,7 +163,6 @@ class QUENX_EXPORT CimInstance {
     CimInstance* m_nextToDestroy = nullptr;  ///< links the queue of instances to destroy
     std::uint64_t m_releaseTime = 0;         ///< when it was queued; 0 for never
     bool m_destructionWaits = false;
-    std::atomic<bool> m_deleted{false};
 };
 
 /// Learns which class of a chain has declared which properties: it collects what the constructors of the

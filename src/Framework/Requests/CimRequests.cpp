@@ -5,7 +5,8 @@
 #include <algorithm>
 #include <functional>
 #include <map>
-#include <unordered_map>
+#include <utility>
+#include <vector>
 
 #include "Framework/Classes/InstanceList.h"
 #include "Framework/Model/CimInstance.h"
@@ -27,20 +28,46 @@ class SeenInstances {
   public:
     /// False for one that was there already.
     bool insert(const CimInstance& instance) {
-        const std::size_t hash = instance.hashOfKeys();
-        const auto [first, last] = m_seen.equal_range(hash);
-        // Texts are compared nearly never, since few others share a hash.
-        const bool isKnown = std::any_of(
-            first, last, [&](const auto& other) { return textOf(*other.second) == textOf(instance); });
-        if (isKnown) return false;
-        m_seen.emplace(hash, &instance);
+        if (m_places.size() <= 2 * m_count) grow();
+        const Place place{instance.hashOfKeys(), &instance};
+        Place& found = placeOf(place);
+        if (found.instance != nullptr) return false;
+        found = place;
+        ++m_count;
         return true;
     }
 
   private:
+    struct Place {
+        std::size_t hash = 0;
+        const CimInstance* instance = nullptr;
+    };
+
     static std::string textOf(const CimInstance& instance) { return CimPath::of(instance).toString(); }
 
-    std::unordered_multimap<std::size_t, const CimInstance*> m_seen;
+    /// Where that path is, or is to be.
+    Place& placeOf(const Place& wanted) {
+        for (std::size_t i = wanted.hash;; ++i) {
+            Place& place = m_places[i & (m_places.size() - 1)];
+            if (place.instance == nullptr) return place;
+            // Texts are compared nearly never, since few others share a hash.
+            if (place.hash == wanted.hash && textOf(*place.instance) == textOf(*wanted.instance))
+                return place;
+        }
+    }
+    void grow() {
+        const std::vector<Place> old =
+            std::exchange(m_places, std::vector<Place>(std::max(kFew, 4 * m_places.size())));
+        for (const Place& each : old)
+            if (each.instance != nullptr) placeOf(each) = each;
+    }
+
+    static constexpr std::size_t kFew = 16;
+
+    // One table, since a node for each instance costs more than all else that is done here. Its size is a
+    // power of two.
+    std::vector<Place> m_places;
+    std::size_t m_count = 0;
 };
 
 /// Calls the visitor once per path.
