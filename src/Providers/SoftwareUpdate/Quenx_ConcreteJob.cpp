@@ -224,13 +224,8 @@ bool Quenx_ConcreteJob::threadControl(ThreadOperationCommand command, int timeou
     return disposing;
 }
 
-bool Quenx_ConcreteJob::isEndServed() const {
-    const utils::Mutex::AutoLocker lock(m_stateMutex);
-    return m_isEndServed;
-}
-
 void Quenx_ConcreteJob::refresh() {
-    if (isEndServed()) return;
+    if (m_isEndServed) return;
     // Asked first: the adapter API may be slow, and nothing slow runs under the property lock.
     const std::uint16_t percentComplete = getPercentComplete();
 

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include <atomic>
 #include <cstdint>
 #include <memory>
 #include <string>
@@ -111,7 +112,6 @@ class Quenx_ConcreteJob : public CIM_ConcreteJob {
     /// True for the one caller who may start the job.
     bool claimStart();
     utils::Time timeSinceStart() const;
-    bool isEndServed() const;
 
     const std::string m_adapterName;
     const int m_jobId;
@@ -132,7 +132,7 @@ class Quenx_ConcreteJob : public CIM_ConcreteJob {
     std::string m_lastErrorText QUENX_GUARDED_BY(m_stateMutex);
     std::uint32_t m_percentComplete QUENX_GUARDED_BY(m_stateMutex) = 0;
     /// The properties say how the job ended, so a refresh would change nothing. False again with any change.
-    bool m_isEndServed QUENX_GUARDED_BY(m_stateMutex) = false;
+    std::atomic<bool> m_isEndServed{false};
     mutable utils::Mutex m_stateMutex;  ///< what the worker writes and requests read; held for moments only
     JobEvents m_events{*this};
 };
