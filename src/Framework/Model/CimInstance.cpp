@@ -242,16 +242,30 @@ std::size_t CimInstance::hashOfKeys() const {
     return *m_hashOfKeys;
 }
 
+namespace {
+
+/// Under the instance's lock, so texts, as most keys are, are compared where they are.
+bool holds(const CimProperty& property, const CimScalar& wanted) {
+    const auto* text = std::get_if<std::string>(&wanted);
+    if (text != nullptr && !property.isNull() && !property.isArray() && property.cellCount() != 0) {
+        const CimCell cell = property.cell(0);
+        if (const auto* held = std::get_if<std::string_view>(&cell)) return *held == *text;
+    }
+    const CimValue value = property.getValue();
+    return value.scalar() != nullptr && sameValue(wanted, *value.scalar());
+}
+
+}  // namespace
+
 bool CimPath::isSameObjectAs(const CimInstance& instance) const {
     if (!isValid() || !sameName(m_className, instance.getCreationClassName())) return false;
     const RecursiveLocker lock(instance.getMutex());
-    const std::vector<CimProperty*> properties = instance.getKeys();
-    if (properties.size() != m_keys.size()) return false;
-    return std::all_of(properties.begin(), properties.end(), [&](const CimProperty* property) {
-        const CimKey* key = findByName(m_keys, property->getName());
-        if (key == nullptr) return false;
-        const CimValue value = property->getValue();
-        return value.scalar() != nullptr && sameValue(key->value, *value.scalar());
+    const std::vector<std::size_t>& keys = instance.keyIndices();
+    if (keys.size() != m_keys.size()) return false;
+    return std::ranges::all_of(keys, [&](std::size_t index) {
+        const CimProperty& property = *instance.getAllProperties()[index];
+        const CimKey* key = findByName(m_keys, property.getName());
+        return key != nullptr && holds(property, key->value);
     });
 }
 
