@@ -42,7 +42,7 @@ Library load() {
     // Its binary interface; the headers that this is compiled with are the same one's.
     constexpr const char* kFile = "libsystemd.so.0";
     Library found;
-    void* const library = ::dlopen(kFile, RTLD_NOW | RTLD_LOCAL | RTLD_NODELETE);
+    void* const library = ::dlopen(kFile, RTLD_NOW);
     const auto find = [&](const char* name, auto& function) {
         using Function = std::remove_reference_t<decltype(function)>;
         if (library != nullptr) function = reinterpret_cast<Function>(::dlsym(library, name));
@@ -75,6 +75,11 @@ const Library& library() {
     return *loaded.load();
 }
 
+/// So all functions of the library tell of an error: -errno.
+bool hasFailed(int result) {
+    return result < 0;
+}
+
 std::string errorText(int result) {
     return std::strerror(-result);
 }
@@ -86,11 +91,17 @@ int becomeReady(sd_bus* bus) {
         const int ready = library().isReady(bus);
         if (ready != 0) return ready;
         const int done = library().process(bus, nullptr);
-        if (done < 0) return done;
+        if (hasFailed(done)) return done;
         const auto left = std::chrono::duration_cast<Microseconds>(end - Clock::now());
         if (left <= Microseconds::zero()) return -ETIMEDOUT;
         if (done == 0) library().wait(bus, static_cast<std::uint64_t>(left.count()));
     }
+}
+
+/// A descriptor of this process's own, since that of a message ends with it.
+int ownDescriptor(int passed) {
+    const int own = ::fcntl(passed, F_DUPFD_CLOEXEC, STDERR_FILENO + 1);
+    return hasFailed(own) ? -errno : own;
 }
 
 /// A descriptor that is the lock, or why there is none.
@@ -102,15 +113,13 @@ int inhibit(sd_bus* bus, const std::string& who, const std::string& why, std::st
     int result = systemd.call(bus, "org.freedesktop.login1", "/org/freedesktop/login1",
                               "org.freedesktop.login1.Manager", "Inhibit", &error, &reply, "ssss",
                               "shutdown:sleep", who.c_str(), why.c_str(), "block");
-    int passed = -1;
-    if (result >= 0) result = systemd.read(reply, "h", &passed);
-    // That of the message ends with it.
-    const int lock = result < 0 ? -1 : ::fcntl(passed, F_DUPFD_CLOEXEC, 3);
-    if (lock < 0)
-        problem = error.message != nullptr ? error.message : errorText(result < 0 ? result : -errno);
+    int passed{};
+    if (!hasFailed(result)) result = systemd.read(reply, "h", &passed);
+    if (!hasFailed(result)) result = ownDescriptor(passed);
+    if (hasFailed(result)) problem = error.message != nullptr ? error.message : errorText(result);
     systemd.endMessage(reply);
     systemd.endError(&error);
-    return lock;
+    return result;
 }
 
 }  // namespace
@@ -130,16 +139,12 @@ Inhibitor::Inhibitor(const std::string& who, const std::string& why) {
     sd_bus* bus = nullptr;
     int result = library().open(&bus);
     const std::unique_ptr<sd_bus, decltype(&::sd_bus_close_unref)> closed(bus, library().close);
-    if (result >= 0) result = becomeReady(bus);
-    if (result < 0) {
+    if (!hasFailed(result)) result = becomeReady(bus);
+    if (hasFailed(result)) {
         m_problem = "the system's bus: " + errorText(result);
     } else {
-        m_lock = inhibit(bus, who, why, m_problem);
+        m_lock.emplace(inhibit(bus, who, why, m_problem));
     }
-}
-
-Inhibitor::~Inhibitor() {
-    if (m_lock >= 0) ::close(m_lock);
 }
 
 }  // namespace logind

@@ -1,7 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include <optional>
 #include <string>
+
+#include "Utils/Os/Linux/linux.h"
 
 namespace logind {
 
@@ -18,7 +21,6 @@ class Inhibitor {
   public:
     /// @param who,why  for people who ask what keeps their machine from shutting down
     Inhibitor(const std::string& who, const std::string& why);
-    ~Inhibitor();
     Inhibitor(const Inhibitor&) = delete;
     Inhibitor& operator=(const Inhibitor&) = delete;
 
@@ -26,7 +28,7 @@ class Inhibitor {
     const std::string& problem() const { return m_problem; }
 
   private:
-    int m_lock = -1;  ///< logind ends the lock when this is closed
+    std::optional<os::Descriptor> m_lock;  ///< logind ends the lock when this is closed
     std::string m_problem;
 };
 

@@ -5,6 +5,7 @@
 
 #include <chrono>
 #include <cstdlib>
+#include <filesystem>
 
 #include "Host/UnixSocket.h"
 #include "Logind/InhibitingLocker.h"
@@ -12,6 +13,7 @@
 #include "Support/SimulatedAdapters.h"
 #include "Support/TestRoms.h"
 #include "System/HeldFlash.h"
+#include "System/RunningDaemon.h"
 
 namespace {
 
@@ -52,7 +54,8 @@ TEST(InhibitorTest, HoldsUpAShutdownAsLongAsALockerIsHeld) {
 }
 
 TEST(InhibitorTest, GoesOnWithoutABusAndWithoutAnAnswer) {
-    EXPECT_THAT(logind::Inhibitor("me", "why").problem(), HasSubstr("is not loaded"));
+    EXPECT_EQ(logind::Inhibitor("me", "why").problem(),
+              "the library that talks to the system's bus is not loaded");
     {
         const StandIn logind(StandIn::Manner::Refuses);
         const OnTheBus address(logind);
@@ -60,7 +63,7 @@ TEST(InhibitorTest, GoesOnWithoutABusAndWithoutAnAnswer) {
     }
     const test::TempFolder folder;
     const OnTheBus nobody("unix:path=" + folder / "bus");
-    EXPECT_THAT(logind::Inhibitor("me", "why").problem(), HasSubstr("No such file or directory"));
+    EXPECT_EQ(logind::Inhibitor("me", "why").problem(), "the system's bus: No such file or directory");
     // A bus that takes the connection and says nothing, and a logind that does.
     const test::UnixSocket silent(SOCK_STREAM, folder / "bus");
     ASSERT_EQ(::listen(silent.number(), 1), 0);
@@ -68,9 +71,17 @@ TEST(InhibitorTest, GoesOnWithoutABusAndWithoutAnAnswer) {
     for (const bool isBusSilent : {true, false}) {
         if (!isBusSilent) ::setenv("DBUS_SYSTEM_BUS_ADDRESS", logind.environment().substr(24).c_str(), 1);
         const auto begun = std::chrono::steady_clock::now();
-        EXPECT_NE(logind::Inhibitor("me", "why").problem(), "");
+        EXPECT_EQ(logind::Inhibitor("me", "why").problem(),
+                  isBusSilent ? "the system's bus: Connection timed out" : "Connection timed out");
         EXPECT_LT(std::chrono::steady_clock::now() - begun, std::chrono::seconds(20)) << "one or two";
     }
+}
+
+TEST(InhibitorTest, LoadsNothingWhereThereIsNoBus) {
+    const OnTheBus address("unix:path=/none");
+    ::unsetenv("DBUS_SYSTEM_BUS_ADDRESS");
+    const bool hasOne = std::filesystem::exists("/run/dbus/system_bus_socket");
+    EXPECT_EQ(logind::loadLibrary(), hasOne ? "" : "there is no system bus");
 }
 
 TEST(InhibitorTest, IsHeldWhileAnAdapterIsWrittenTo) {
@@ -89,6 +100,20 @@ TEST(InhibitorTest, IsHeldWhileAnAdapterIsWrittenTo) {
     flash.release();
     EXPECT_EQ(update.finish().status, 0);
     EXPECT_FALSE(logind.isHeld(false));
+}
+
+TEST(InhibitorTest, IsHeldByTheDaemonThatWrites) {
+    const StandIn logind(StandIn::Manner::Grants);
+    const test::RunningDaemon daemon({}, {logind.environment()});
+    test::HeldFlash flash(daemon.folder() / "state/eth0");
+    test::Program update({QUENXCTL, "--server", "http://127.0.0.1:" + std::to_string(daemon.httpPort()),
+                          "--user", "admin", "install", "--target", "eth0", daemon.image()},
+                         test::Program::Output::Pipes, {"QUENXCTL_PASSWORD=admin"});
+    EXPECT_TRUE(flash.isWaitedFor());
+    EXPECT_THAT(logind.asked(), HasSubstr("/quenx-cimd/"));
+    EXPECT_TRUE(logind.isHeld(true));
+    flash.release();
+    EXPECT_EQ(update.finish().status, 0);
 }
 
 }  // namespace
