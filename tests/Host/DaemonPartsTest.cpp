@@ -6,9 +6,9 @@
 #include <fstream>
 
 #include "Host/Authentication/PasswordChecker.h"
-#include "Host/Control/Spool.h"
 #include "Host/Daemon/CommandLine.h"
 #include "Host/Daemon/Daemon.h"
+#include "Host/Daemon/IndicationSettings.h"
 #include "Host/Daemon/Report.h"
 #include "Host/Daemon/SettingsField.h"
 #include "Host/Server/HttpServer.h"
@@ -16,9 +16,9 @@
 #include "Host/Server/ServerCertificate.h"
 #include "Host/Server/TlsPriorities.h"
 #include "Host/UnixSocket.h"
+#include "Support/SyslogCapture.h"
 #include "Support/TempFolder.h"
 #include "Support/Together.h"
-#include "Utils/Os/Linux/OwnFiles.h"
 
 namespace {
 
@@ -64,14 +64,35 @@ TEST(CommandLineTest, PutsOptionsBeforeTheFile) {
         options.insert(options.begin(), {"quenx-cimd", "--config", file.c_str()});
         return host::readCommandLine(static_cast<int>(options.size()), options.data());
     };
-    const auto line = read({"--listen-http-port", "3", "--listen-http"});
+    const auto line = read({"--listen-http-port", "65535", "--listen-http"});
     EXPECT_FALSE(line.exitStatus);
-    EXPECT_EQ(line.settings.listen.httpPort, 3);
+    EXPECT_EQ(line.settings.listen.httpPort, 65535);
     EXPECT_EQ(line.settings.listen.httpsPort, 2);
     EXPECT_TRUE(line.settings.listen.http);
     EXPECT_THAT(line.settings.authentication.readers, ElementsAre("a", "@b"));
     EXPECT_EQ(line.settings.authentication.rememberFor, std::chrono::seconds(5));
     EXPECT_THAT(read({"--auth-readers", "b", "c"}).settings.authentication.readers, ElementsAre("b", "c"));
+    EXPECT_FALSE(read({"--limits-body-bytes", "16384", "--limits-enumeration-seconds", "600",
+                       "--uploads-image-bytes", "1073741824"})
+                     .exitStatus)
+        << "no more than others allow";
+}
+
+TEST(SettingsTest, SayWhereIndicationsMayGo) {
+    using Kind = indications::DestinationRule::Kind;
+    const auto rule = [](std::vector<std::string> destinations) {
+        Settings settings;
+        settings.indications.destinations = std::move(destinations);
+        const auto result = host::subscriptionSettings(settings).destinations;
+        return std::pair(result.kind, static_cast<int>(result.networks.size()));
+    };
+    EXPECT_EQ(rule({}), std::pair(Kind::Subscriber, 0));
+    EXPECT_EQ(rule({"subscriber"}), std::pair(Kind::Subscriber, 0));
+    EXPECT_EQ(rule({"any"}), std::pair(Kind::Any, 0));
+    EXPECT_EQ(rule({"10.0.0.0/8"}), std::pair(Kind::Listed, 1));
+    EXPECT_EQ(rule({"10.0.0.0/8", "2001:db8::/32"}), std::pair(Kind::Listed, 2));
+    for (const char* alone : {"any", "subscriber"})
+        EXPECT_THROW(rule({alone, "10.0.0.0/8"}), std::runtime_error) << alone;
 }
 
 TEST(ServerCertificateTest, IsRenewedOnlyIfMadeByAnUnsetClock) {
@@ -113,24 +134,6 @@ TEST(TlsPrioritiesTest, AreRefusedWhereTheLibraryDoesNotKnowThem) {
                 ThrowsMessage<std::runtime_error>(HasSubstr("Define them in the section [priorities] of /")));
 }
 
-TEST(SpoolTest, RemovesWhatAKilledDaemonHasLeftOfAnUpload) {
-    const test::TempFolder folder;
-    for (const char* name : {"images", "images/a"})
-        fs::create_directory(folder / name);
-    folder.write("images/.part-x", "half");
-    folder.write("images/a/new.rom", "whole");
-    const host::UploadSettings settings{.directory = folder / "images"};
-    EXPECT_THAT([&] { const host::Spool spool(settings); },
-                ThrowsMessage<std::runtime_error>(HasSubstr("run: chmod 700 " + settings.directory)))
-        << "others may need it as it is";
-    fs::permissions(settings.directory, fs::perms(0700));
-    os::makeOwnFolder(folder / "named/with/");
-    EXPECT_EQ(fs::status(folder / "named/with").permissions(), fs::perms(0700));
-    const host::Spool spool(settings);
-    EXPECT_FALSE(fs::exists(folder / "images/.part-x"));
-    EXPECT_TRUE(fs::exists(folder / "images/a/new.rom"));
-}
-
 TEST(ReportTest, TellsTheServiceManagerAndKeepsNoDescriptor) {
     const test::TempFolder folder;
     const auto descriptors = [] { return std::distance(fs::directory_iterator("/proc/self/fd"), {}); };
@@ -141,8 +144,14 @@ TEST(ReportTest, TellsTheServiceManagerAndKeepsNoDescriptor) {
         host::notifyServiceManager("READY=1");
         EXPECT_EQ(descriptors(), before);
         EXPECT_EQ(manager.received(), "READY=1\n") << path;
+        // One that does not read holds up nobody.
+        for (int i = 0; i < 1000; ++i)
+            host::notifyServiceManager("STATUS=x");
     }
     ::unsetenv("NOTIFY_SOCKET");
+    const test::SyslogCapture log;
+    host::reportProblem("It burns.");
+    EXPECT_THAT(log.lines().at(0).text, HasSubstr("It burns."));
 }
 
 TEST(PasswdTest, LosesNoChangeThatOthersMake) {

@@ -24,7 +24,7 @@ std::optional<std::string> decodeBase64(std::string text) {
         text += '=';
     const gnutls_datum_t encoded{reinterpret_cast<unsigned char*>(text.data()),
                                  static_cast<unsigned int>(text.size())};
-    gnutls_datum_t decoded{nullptr, 0};
+    gnutls_datum_t decoded{};
     const int outcome = ::gnutls_base64_decode2(&encoded, &decoded);
     // Not the client's fault, who would ask for another password.
     if (outcome == GNUTLS_E_MEMORY_ERROR) throw std::bad_alloc();

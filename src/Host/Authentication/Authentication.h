@@ -76,7 +76,7 @@ class CredentialCache {
 
     const std::chrono::seconds m_rememberFor;
     utils::Mutex m_mutex;
-    std::uint64_t m_generation QUENX_GUARDED_BY(m_mutex) = 0;
+    std::uint64_t m_generation QUENX_GUARDED_BY(m_mutex){};
     Digest m_key{};
     std::map<Digest, Entry> m_entries QUENX_GUARDED_BY(m_mutex);
 };

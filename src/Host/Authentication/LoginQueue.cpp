@@ -25,8 +25,9 @@ LoginQueue::Clock::time_point LoginQueue::readyAt(const Attempt& attempt) const 
 }
 
 std::vector<LoginQueue::Waiter*>::iterator LoginQueue::next(Clock::time_point now) {
+    // No stranger goes before somebody known who waits: all slots are taken then, and the next one is not
+    // theirs.
     const auto isBefore = [&](const Attempt& left, const Attempt& right) {
-        if (left.isKnown != right.isKnown) return left.isKnown;
         return m_places.lastOf(left.place) < m_places.lastOf(right.place);
     };
     auto first = m_waiting.end();
@@ -65,7 +66,7 @@ void LoginQueue::chooseTimekeeper() noexcept {
 
 bool LoginQueue::enter(const Attempt& attempt, const std::stop_token& stop) {
     std::unique_lock lock(m_mutex);
-    Waiter me{attempt, false, false, {}};
+    Waiter me{attempt};
     m_waiting.push_back(&me);
     callNext();
     const auto givesUp = Clock::now() + m_pace.patience;

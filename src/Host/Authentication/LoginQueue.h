@@ -103,7 +103,7 @@ class LoginQueue {
         const Attempt& attempt;
         bool isCalled = false;
         bool keepsTime = false;  ///< has to look again when it may go, and to call whoever goes then
-        std::condition_variable_any called;
+        std::condition_variable_any called{};
     };
 
     bool enter(const Attempt& attempt, const std::stop_token& stop);
@@ -121,7 +121,7 @@ class LoginQueue {
     FailureDelays m_users;
     std::vector<Waiter*> m_waiting;  ///< in the order in which they came
     unsigned int m_running = 0;
-    Clock::duration m_slowest{0};
+    Clock::duration m_slowest{};
 };
 
 }  // namespace host

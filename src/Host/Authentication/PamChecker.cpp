@@ -19,16 +19,14 @@ constexpr const char* kAdministrators = "quenx-admin";
 
 /// Answers every prompt for a hidden text with the password, and the others with nothing.
 int converse(int count, const pam_message** messages, pam_response** responses, void* data) {
-    if (count <= 0 || count > PAM_MAX_NUM_MSG) return PAM_CONV_ERR;
     auto* answers =
         static_cast<pam_response*>(std::calloc(static_cast<std::size_t>(count), sizeof(pam_response)));
     if (answers == nullptr) return PAM_BUF_ERR;
-    for (int i = 0; i < count; ++i) {
-        // A module may ask for more than a password, such as a code; without an answer it refuses.
-        if (messages[i]->msg_style == PAM_PROMPT_ECHO_OFF) {
-            answers[i].resp = ::strdup(static_cast<const Credentials*>(data)->password.c_str());
-        }
-    }
+    // A module may ask for more than a password, such as a code; without an answer it refuses.
+    std::transform(messages, messages + count, answers, [data](const pam_message* message) {
+        const char* password = static_cast<const Credentials*>(data)->password.c_str();
+        return pam_response{message->msg_style == PAM_PROMPT_ECHO_OFF ? ::strdup(password) : nullptr, {}};
+    });
     *responses = answers;  // PAM frees them
     return PAM_SUCCESS;
 }
@@ -47,9 +45,7 @@ class PamSession {
         void (*delay)(int, unsigned int, void*) = noDelay;
         ::pam_set_item(m_handle, PAM_FAIL_DELAY, reinterpret_cast<const void*>(delay));
     }
-    ~PamSession() {
-        if (m_handle != nullptr) ::pam_end(m_handle, m_status);
-    }
+    ~PamSession() { ::pam_end(m_handle, m_status); }  // takes none, too
     PamSession(const PamSession&) = delete;
     PamSession& operator=(const PamSession&) = delete;
 
@@ -59,7 +55,8 @@ class PamSession {
         // Even if the password is right, the account may have expired or be locked.
         if (m_status == PAM_SUCCESS) m_status = ::pam_acct_mgmt(m_handle, kFlags);
         // Not PAM_AUTHINFO_UNAVAIL, which may mean that the user is unknown: that must not be told.
-        if (m_status == PAM_BUF_ERR || m_status == PAM_SYSTEM_ERR || m_status == PAM_ABORT)
+        constexpr std::array kBroken{PAM_BUF_ERR, PAM_SYSTEM_ERR, PAM_ABORT};
+        if (std::ranges::find(kBroken, m_status) != kBroken.end())
             throw CheckFailed(::pam_strerror(m_handle, m_status));
         return m_status == PAM_SUCCESS;
     }
@@ -74,7 +71,7 @@ class PamSession {
 std::optional<std::pair<uid_t, gid_t>> findAccount(const std::string& user) {
     passwd entry{};
     passwd* found = nullptr;
-    std::array<char, 16384> buffer{};
+    std::array<char, 16'384> buffer{};
     // Not getpwnam(): requests are served on many threads.
     ::getpwnam_r(user.c_str(), &entry, buffer.data(), buffer.size(), &found);
     if (found == nullptr) return std::nullopt;
@@ -94,16 +91,15 @@ std::vector<gid_t> groupsOf(const std::string& user, gid_t first) {
 bool isMember(const std::vector<gid_t>& groups, const std::string& group) {
     struct group entry {};
     struct group* found = nullptr;
-    std::array<char, 65536> buffer{};
-    if (::getgrnam_r(group.c_str(), &entry, buffer.data(), buffer.size(), &found) != 0 || found == nullptr) {
-        return false;
-    }
+    std::array<char, 65'536> buffer{};
+    ::getgrnam_r(group.c_str(), &entry, buffer.data(), buffer.size(), &found);
+    if (found == nullptr) return false;
     return std::find(groups.begin(), groups.end(), entry.gr_gid) != groups.end();
 }
 
 /// What a user of the system may do.
 User systemUser(const std::string& name, const std::vector<std::string>& readers) {
-    User user{name, false, false};
+    User user{name};
     const auto account = findAccount(name);
     // PAM can know users that the system does not; without groups they may do nothing.
     if (!account) return user;

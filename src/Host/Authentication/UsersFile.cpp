@@ -43,7 +43,6 @@ bool sameHash(std::string_view left, std::string_view right) {
 
 std::string crypted(const std::string& password, const std::string& setting) {
     const auto data = std::make_unique<crypt_data>();  // 32 KiB: too much for the stack of a thread
-    errno = 0;
     const char* hash = ::crypt_r(password.c_str(), setting.c_str(), data.get());
     const bool isFailure = hash == nullptr || *hash == '*';
     // Some methods take megabytes, and say EINVAL as well as ENOMEM where there are none. The right password
@@ -183,13 +182,13 @@ void UsersFile::reload() {
 }
 
 std::optional<User> UsersFile::check(const Credentials& credentials, const std::string&) {
-    bool isKnown = false;
+    bool isKnown{};
     UserEntry entry;
     {
         const utils::Mutex::AutoLocker lock(m_mutex);
         const auto found = m_users.find(credentials.user);
         isKnown = found != m_users.end();
-        entry = isKnown ? found->second : UserEntry{m_decoy, false};
+        entry = isKnown ? found->second : UserEntry{m_decoy};
     }
     // The hash of an unknown user is checked as well: a fast answer would tell who exists.
     const bool isRight = sameHash(crypted(credentials.password, entry.hash), entry.hash);

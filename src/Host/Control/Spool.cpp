@@ -5,6 +5,7 @@
 #include <sys/stat.h>
 
 #include <algorithm>
+#include <array>
 #include <cerrno>
 #include <cstdlib>
 #include <filesystem>
@@ -27,7 +28,8 @@ namespace fs = std::filesystem;
 constexpr const char* kPart = ".part-";
 
 [[noreturn]] void refuseStoring(int error, const std::string& folder) {
-    if (error == ENOSPC || error == EDQUOT || error == EFBIG)
+    constexpr std::array kNoRoom{ENOSPC, EDQUOT, EFBIG};
+    if (std::ranges::find(kNoRoom, error) != kNoRoom.end())
         throw ControlRefusal(507, "there is no room for the file below " + folder + " (" +
                                       std::generic_category().message(error) +
                                       "); nothing was changed; free some space there and try again");
