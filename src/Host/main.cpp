@@ -25,16 +25,15 @@ class Signals {
     }
 
     int wait() const {
-        int signal = 0;
+        int signal{};
         while (::sigwait(&m_set, &signal) != 0) {
         }
         return signal;
     }
-    /// 0 when none came in a tenth of a second: as long as a stop may last longer than what it waits for.
-    int waitBriefly() const {
-        const timespec patience{0, 100000000};
-        const int signal = ::sigtimedwait(&m_set, nullptr, &patience);
-        return signal < 0 ? 0 : signal;
+    /// Whether one came in a tenth of a second: as long as a stop may last longer than what it waits for.
+    bool comesSoon() const {
+        const timespec patience{0, 100'000'000};
+        return ::sigtimedwait(&m_set, nullptr, &patience) > 0;
     }
 
   private:
@@ -84,7 +83,7 @@ void stop(host::Daemon& daemon, const Signals& signals) {
             host::notifyServiceManager("EXTEND_TIMEOUT_USEC=30000000\nSTATUS=" + waiting);
         });
         // An adapter that is written to half is worse than a slow stop.
-        if (!isDone && signals.waitBriefly() != 0)
+        if (!isDone && signals.comesSoon())
             withoutFail([&] { host::report("Asked again to stop. Still waiting for " + said + "."); });
     }
 }

@@ -211,4 +211,12 @@ TEST(EndedJobsTest, AreSurplusByNumberAndAge) {
     EXPECT_TRUE(host::EndedJobs({}).look(all, now).empty());
 }
 
+TEST(EndedJobsTest, AreLookedForAsOftenAsTheBoundsNeed) {
+    EXPECT_EQ(host::pauseBetweenLooks({0, 0s}), std::nullopt);
+    EXPECT_EQ(host::pauseBetweenLooks({1, 0s}), 10s);
+    EXPECT_EQ(host::pauseBetweenLooks({0, 1s}), 1s);
+    EXPECT_EQ(host::pauseBetweenLooks({0, 50s}), 5s);
+    EXPECT_EQ(host::pauseBetweenLooks({1, 24h}), 10s);
+}
+
 }  // namespace

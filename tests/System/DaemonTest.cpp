@@ -20,7 +20,9 @@ using test::contains;
 using test::ProgramResult;
 using test::RunningDaemon;
 using ::testing::AllOf;
+using ::testing::EndsWith;
 using ::testing::HasSubstr;
+using ::testing::StartsWith;
 
 /// Starts the update of eth0 to a real image and returns the job's path.
 std::string startUpdate(const RunningDaemon& daemon) {
@@ -30,7 +32,7 @@ std::string startUpdate(const RunningDaemon& daemon) {
         "cm", service,
         {"InstallFromURI.URI=\"file://" + daemon.image() + "\",InstallOptions=5,Target=" + port});
     EXPECT_TRUE(contains(called.out, "InstallFromURI: 4096")) << called.out << called.error;
-    const std::string job = daemon.lines("ein", "Quenx_ConcreteJob").at(0);
+    const std::string job = daemon.lines("ein", "Quenx_ConcreteJob").back();
     EXPECT_TRUE(contains(called.out, job)) << called.out;
     return job;
 }
@@ -81,27 +83,38 @@ TEST(DaemonTest, LetsAFlashEndBeforeItStops) {
         const test::TempFolder folder;
         const test::UnixSocket manager(SOCK_DGRAM, folder / "notify");
         RunningDaemon daemon({}, {"NOTIFY_SOCKET=" + folder / "notify"});
+        ASSERT_TRUE(reaches(daemon, startUpdate(daemon), "7"));
         test::HeldFlash flash(daemon.folder() / "state/eth0");
         const std::string job = startUpdate(daemon);
         ASSERT_TRUE(reaches(daemon, job, "4"));
         if (isDeleted) daemon.lines("di", job);
+        daemon.program().send(SIGHUP);
+        ASSERT_TRUE(daemon.program().waitFor("Reloaded the certificate and key."));
         daemon.program().send(SIGTERM);
-        ASSERT_TRUE(daemon.program().waitFor(
-            isDeleted ? "Waiting for the update of eth0, whose job was deleted."
-                      : "Waiting for the update of eth0 (Quenx:FirmwareUpdate@Job#1 at "));
+        const std::string rest = isDeleted ? "the update of eth0, whose job was deleted."
+                                           : "the update of eth0 (Quenx:FirmwareUpdate@Job#2 at 0 %).";
+        ASSERT_TRUE(daemon.program().waitFor("Waiting for " + rest));
+        EXPECT_FALSE(test::RawConnection(daemon.httpPort(), "127.0.0.1").send("GET"));
+        std::this_thread::sleep_for(std::chrono::milliseconds(300));
         // What means nothing here must not end a flash.
         for (const int signal : {SIGUSR1, SIGUSR2, SIGALRM, SIGHUP})
             daemon.program().send(signal);
-        EXPECT_TRUE(daemon.program().waitFor("Asked again to stop. Still waiting for "));
+        EXPECT_TRUE(daemon.program().waitFor("Asked again to stop. Still waiting for " + rest));
         flash.release();
         const ProgramResult result = daemon.program().finish();
         EXPECT_EQ(result.status, 0) << result.out;
-        EXPECT_TRUE(contains(result.out, "Stopped.")) << result.out;
-
-        const std::string told = manager.received();
-        for (const char* part :
-             {"READY=1", "STOPPING=1", "EXTEND_TIMEOUT_USEC=30000000", "STATUS=Waiting for"})
-            EXPECT_THAT(told, HasSubstr(part));
+        const std::string said = result.out.substr(result.out.find("quenx-cimd: Stopping."));
+        EXPECT_THAT(
+            said, AllOf(StartsWith("quenx-cimd: Stopping.\r\nquenx-cimd: Waiting for " + rest +
+                                   "\r\nquenx-cimd: Asked again to stop. Still waiting for " + rest + "\r\n"),
+                        EndsWith("\nquenx-cimd: Stopped.\r\n")));
+        const std::string ready =
+            "READY=1\nSTATUS=Serving https://127.0.0.1:" + std::to_string(daemon.httpsPort()) +
+            " http://127.0.0.1:" + std::to_string(daemon.httpPort()) + " unix:" + daemon.folder().path() +
+            "/socket\n";
+        EXPECT_THAT(manager.received(),
+                    StartsWith(ready + "RELOADING=1\n" + ready + "STOPPING=1\nSTATUS=Stopping.\n" +
+                               "EXTEND_TIMEOUT_USEC=30000000\nSTATUS=Waiting for " + rest + "\n"));
     }
 }
 
@@ -169,13 +182,14 @@ bool canMount() {
 }
 
 TEST(DaemonTest, SaysThatItsPolicyIsBadAndGoesOnServingReaders) {
-    RunningDaemon daemon;
-    const std::string policy = daemon.folder().write("policy.toml", "administrators = 'admin'\n");
+    RunningDaemon daemon({}, {}, {}, "administrators = 'admin'\n");
+    const std::string said =
+        "The policy cannot be obeyed, and nothing is installed or deleted until it is mended: " +
+        daemon.folder().path() + "/policy.toml, line ";
+    EXPECT_THAT(daemon.program().seen(), HasSubstr(said + "1: "));
+    daemon.folder().write("policy.toml", "\nadministrators = 'admin'\n");
     daemon.program().send(SIGHUP);
-    EXPECT_TRUE(
-        daemon.program().waitFor("The policy cannot be obeyed, and nothing is installed or deleted "
-                                 "until it is mended: " +
-                                 policy + ", line 1: "));
+    EXPECT_TRUE(daemon.program().waitFor(said + "2: "));
     EXPECT_EQ(daemon.lines("ein", "Quenx_EthernetPort").size(), 5U);
 }
 
@@ -189,10 +203,9 @@ TEST(DaemonTest, ReadsTheSystemsFilesWhereNoneAreNamed) {
                                         etc.path(), program, arguments}),
                          {"QUENX_ADAPTERS", "QUENX_BACKEND"});
     };
-    EXPECT_THAT(
-        withThisEtc(QUENXCTL, "adapters").out,
-        ::testing::StartsWith("There are no adapters.\nEthernet adapters were looked for on PCI (class "
-                              "0200 in /sys/bus/pci/devices): 0 were found. Simulated ones can"));
+    EXPECT_THAT(withThisEtc(QUENXCTL, "adapters").out,
+                StartsWith("There are no adapters.\nEthernet adapters were looked for on PCI (class "
+                           "0200 in /sys/bus/pci/devices): 0 were found. Simulated ones can"));
     etc.write("quenx-adapters.toml", test::kTestAdapters);
     etc.write("quenx-cimprovider.conf", "FWFilePath=/etc\n");
     etc.write("new.rom", test::realRom("efi-virtio"));
@@ -211,6 +224,7 @@ TEST(DaemonTest, ReadsTheSystemsFilesWhereNoneAreNamed) {
 
     const ProgramResult without = withThisEtc(QUENX_CIMD, "--check-config");
     EXPECT_FALSE(contains(without.error, "quenx-cimd.toml")) << without.error;
+    EXPECT_THAT(without.error, HasSubstr(" /etc/pam.d/quenx-cimd does not exist, so PAM applies "));
     std::filesystem::create_directory(etc / "quenx-cimd");
     etc.write("quenx-cimd/quenx-cimd.toml", "[listen]\nhttp = 1\n");
     const ProgramResult with = withThisEtc(QUENX_CIMD, "--check-config");
@@ -228,24 +242,40 @@ TEST(DaemonTest, AsksPamAndTheGroupsOfTheSystem) {
     std::filesystem::copy(QUENX_PACKAGING_DIR "/pam.d", etc / "pam.d",
                           std::filesystem::copy_options::overwrite_existing);
     RunningDaemon daemon(
-        {"--auth-method", "pam", "--auth-readers", "reader", "@watchers"}, {},
+        {"--auth-method", "pam", "--auth-readers", "reader", "@absent", "@watchers"}, {},
         withOwnMounts({"for f in passwd shadow group pam.d; do mount --bind $0/$f /etc/$f; done; exec \"$@\"",
                        etc.path()}));
     const char* const kMayDelete = "(6) CIM_ERR_NOT_FOUND";
     const char* const kMayRead = "(2) CIM_ERR_ACCESS_DENIED";
     const char* const kWrong = "Invalid username/password";
-    const std::tuple<const char*, const char*, const char*> table[] = {
-        {"root", "secret", kMayDelete}, {"chief", "secret", kMayDelete},
-        {"reader", "secret", kMayRead}, {"watcher", "secret", kMayRead},
-        {"chief", "wrong", kWrong},     {"other", "secret", "HTTP response code said error"},
-        {"expired", "secret", kWrong},  {"unknown", "secret", kWrong},
-    };
-    for (const auto& [user, password, expected] : table) {
+    const char* const kRefused = "HTTP response code said error";
+    const auto expectFor = [&](const char* user, const char* password, const char* expected) {
         daemon.user = user;
         daemon.password = password;
         EXPECT_THAT(daemon.wbemcli("di", "Quenx_ConcreteJob.InstanceID=\"none\"").error, HasSubstr(expected))
             << user;
+    };
+    const std::tuple<const char*, const char*, const char*> table[] = {
+        {"root", "secret", kMayDelete},  {"chief", "secret", kMayDelete}, {"reader", "secret", kMayRead},
+        {"watcher", "secret", kMayRead}, {"chief", "wrong", kWrong},      {"other", "secret", kRefused},
+        {"expired", "secret", kWrong},   {"unknown", "secret", kWrong},   {"blank", "", kWrong}};
+    for (const auto& [user, password, expected] : table)
+        expectFor(user, password, expected);
+    // What the modules are told, and what is made of their answers. Those are no wrong passwords.
+    const auto askInstead = [&](const std::string& line) {
+        etc.write("pam.d/quenx-cimd", "auth " + line + "\naccount required pam_permit.so\n");
+    };
+    askInstead("optional pam_exec.so log=" + etc.path() + "/told /usr/bin/env\nauth required pam_permit.so");
+    expectFor("nobody-here", "x", kRefused);
+    const auto told = test::readTestFile(etc / "told");
+    EXPECT_THAT(std::string(told.begin(), told.end()),
+                AllOf(HasSubstr("PAM_RHOST=127.0.0.1\n"), HasSubstr("PAM_SERVICE=quenx-cimd\n")));
+    for (const char* error : {"buf_err", "system_err", "abort"}) {
+        askInstead(std::string("required pam_debug.so auth=") + error);
+        expectFor("other", error, kRefused);
     }
+    askInstead("required pam_debug.so auth=authinfo_unavail");
+    expectFor("other", "x", kWrong);
 }
 
 class DaemonSessionTest : public ::testing::TestWithParam<const char*> {

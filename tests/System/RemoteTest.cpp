@@ -58,7 +58,9 @@ bool hasIpv6Loopback() {
 
 TEST(Ipv6Test, LogsInAndInstallsOverTls) {
     if (!hasIpv6Loopback()) GTEST_SKIP() << "this machine has no IPv6 loopback";
-    const test::RunningDaemon daemon({"--listen-address", "::1"});
+    test::RunningDaemon daemon({"--listen-address", "::1"});
+    EXPECT_TRUE(
+        contains(daemon.program().seen(), " http://[::1]:" + std::to_string(daemon.httpPort()) + " "));
     const auto quenxctl = [&daemon](const std::string& options, const std::string& password) {
         const std::string server = "--server https://[::1]:" + std::to_string(daemon.httpsPort());
         return test::run(test::withWordsOf(server + " --user admin " + options, daemon.image(), {QUENXCTL}),

@@ -131,8 +131,8 @@ void checkUploads(const UploadSettings& settings) try {
     requireWritable(settings.directory + "/image", advice);
     struct stat status {};
     const fs::path nearest = nearestOf(settings.directory);
-    const bool isOwn =
-        ::stat(nearest.c_str(), &status) == 0 && (status.st_uid == 0 || status.st_uid == ::geteuid());
+    ::stat(nearest.c_str(), &status);
+    const bool isOwn = status.st_uid == 0 || status.st_uid == ::geteuid();
     const bool isOpen = isOwn && nearest == fs::absolute(settings.directory) && (status.st_mode & 077) != 0;
     if (isOpen)
         throw std::runtime_error("others may look into " + nearest.string() + "; run: chmod 700 " +

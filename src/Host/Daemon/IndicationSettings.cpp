@@ -3,6 +3,7 @@
 
 #include <gnutls/x509.h>
 
+#include <span>
 #include <stdexcept>
 
 #include "Utils/Os/Linux/linux.h"
@@ -46,12 +47,12 @@ void requireCertificates(const std::string& file) {
     const gnutls_datum_t bytes{reinterpret_cast<unsigned char*>(text->data()),
                                static_cast<unsigned int>(text->size())};
     gnutls_x509_crt_t* list = nullptr;
-    unsigned int count = 0;
+    unsigned int count{};
     const int status = ::gnutls_x509_crt_list_import2(&list, &count, &bytes, GNUTLS_X509_FMT_PEM, 0);
     if (status < 0)
         throw std::runtime_error("Cannot use " + file + ": " + ::gnutls_strerror(status) + advice);
-    for (unsigned int i = 0; i < count; ++i)
-        ::gnutls_x509_crt_deinit(list[i]);
+    for (gnutls_x509_crt_t each : std::span(list, count))
+        ::gnutls_x509_crt_deinit(each);
     ::gnutls_free(list);
 }
 

@@ -5,6 +5,7 @@
 
 #include "Framework/Requests/Audit.h"
 #include "Framework/Requests/Caller.h"
+#include "Host/Authentication/ClientAddress.h"
 #include "Host/Repetition.h"
 #include "Providers/Schema/ValueMaps.h"
 
@@ -38,32 +39,37 @@ EndedJobs::Surplus EndedJobs::look(const std::vector<core::InstanceValue>& jobs,
     const auto isOlder = [](const auto& left, const auto& right) { return left.first < right.first; };
     std::stable_sort(ended.begin(), ended.end(), isOlder);
     Surplus surplus;
-    for (std::size_t i = 0; i < ended.size(); ++i) {
-        const auto& [since, path] = ended[i];
-        if (m_settings.keep != 0 && ended.size() - i > m_settings.keep) {
+    std::size_t left = ended.size();
+    for (const auto& [since, path] : ended) {
+        if (m_settings.keep != 0 && left > m_settings.keep) {
             surplus.emplace_back(*path, "jobs.keep");
         } else if (m_settings.keepFor.count() != 0 && now - since >= m_settings.keepFor) {
             surplus.emplace_back(*path, "jobs.keep_seconds");
         }
+        --left;
     }
     return surplus;
 }
 
+std::optional<std::chrono::seconds> pauseBetweenLooks(const JobSettings& settings) {
+    constexpr std::chrono::seconds kLongest{10};
+    if (settings.keepFor.count() != 0)
+        return std::clamp(settings.keepFor / 10, std::chrono::seconds(1), kLongest);
+    return settings.keep == 0 ? std::nullopt : std::optional(kLongest);
+}
+
 JobRetention::JobRetention(const JobSettings& settings, std::shared_ptr<core::CimOperations> operations)
     : m_jobs(settings), m_operations(std::move(operations)) {
-    constexpr std::chrono::seconds kLongest{10};
-    if (settings.keep == 0 && settings.keepFor.count() == 0) return;
-    const auto pause = settings.keepFor.count() == 0
-                           ? kLongest
-                           : std::clamp(settings.keepFor / 10, std::chrono::seconds(1), kLongest);
+    const auto pause = pauseBetweenLooks(settings);
+    if (!pause) return;
     // A look fails while no provider here serves jobs.
     m_thread = std::jthread(
-        [this, pause](const std::stop_token& stop) { repeat(stop, pause, [this] { sweep(); }); });
+        [this, pause](const std::stop_token& stop) { repeat(stop, *pause, [this] { sweep(); }); });
 }
 
 void JobRetention::sweep() {
     const core::Caller itself{
-        .principal = "quenx-cimd", .address = "local", .front = "quenx-cimd", .isFront = true};
+        .principal = "quenx-cimd", .address = kLocalAddress, .front = "quenx-cimd", .isFront = true};
     const core::CallerScope scope(itself);
     const auto jobs = m_operations->enumerateInstances(kJobClass, {{"JobState"}});
     for (const auto& [path, setting] : m_jobs.look(jobs, EndedJobs::Clock::now())) {

@@ -6,6 +6,7 @@
 #include <map>
 #include <memory>
 #include <mutex>
+#include <optional>
 #include <string>
 #include <thread>
 #include <utility>
@@ -34,9 +35,12 @@ class EndedJobs {
     std::map<std::string, Clock::time_point> m_firstSeen;  ///< by path
 };
 
+/// How often to look for those: ten times as often as one can come to be beyond the bounds, but every one to
+/// ten seconds. Nothing without a bound.
+std::optional<std::chrono::seconds> pauseBetweenLooks(const JobSettings& settings);
+
 /// Deletes the jobs that have ended, completed or failed, and are beyond the bounds, as a client does by
-/// DeleteInstance, and leaves an audit line for each. Looks on a thread of its own, every ten seconds or more
-/// often; never without a bound.
+/// DeleteInstance, and leaves an audit line for each. Looks on a thread of its own.
 class JobRetention {
   public:
     JobRetention(const JobSettings& settings, std::shared_ptr<core::CimOperations> operations);
