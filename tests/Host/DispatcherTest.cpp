@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+#include <sstream>
 #include <thread>
 
 #include "Host/DispatcherFixture.h"
@@ -115,18 +116,31 @@ TEST_F(DispatcherTest, AnswersEachMistakeByItsStatus) {
         {4, "Associators", {{"ObjectName", a}, {"AssocClass", unknown}}},
         {4, "References", {{"ObjectName", a}, {"ResultClass", unknown}}},
         {6, "GetQualifier", {{"QualifierName", "Unknown"}}},
+        {4, "ExecQuery", {{"Query", "SELECT"}}},
+        {4, "ExecQuery", {{"QueryLanguage", "WQL"}}},
         {14, "ExecQuery", {{"QueryLanguage", "WQL"}, {"Query", "SELECT"}}},
         {7, "OpenQueryInstances", {{"FilterQuery", "SELECT"}}},
         {7, "SetProperty", {{"PropertyName", "x"}}},
         {7, "Nonsense", {}},
         {25, "OpenEnumerateInstances", {{"ClassName", known}, {"FilterQuery", "x"}}},
+        {25, "OpenEnumerateInstances", {{"ClassName", known}, {"FilterQueryLanguage", "x"}}},
         {26, "OpenEnumerateInstances", {{"ClassName", known}, {"ContinueOnError", "TRUE"}}},
+        {0, "OpenEnumerateInstances", {{"ClassName", known}, {"OperationTimeout", "100"}}},
+        {22, "OpenEnumerateInstances", {{"ClassName", known}, {"OperationTimeout", "0"}}},
         {22, "OpenEnumerateInstances", {{"ClassName", known}, {"OperationTimeout", "101"}}},
         {21, "PullInstancesWithPath", {{"EnumerationContext", "x"}, {"MaxObjectCount", "1"}}},
         {21, "CloseEnumeration", {{"EnumerationContext", "x"}}},
     };
     for (const auto& [expected, operation, parameters] : table)
         EXPECT_EQ(status(operation, parameters), expected) << operation << parameters.size();
+    std::istringstream needy(
+        "GetClass EnumerateInstances EnumerateInstanceNames DeleteInstance CreateInstance ModifyInstance "
+        "Associators AssociatorNames References ReferenceNames GetQualifier OpenEnumerateInstances "
+        "OpenEnumerateInstancePaths OpenAssociatorInstances OpenAssociatorInstancePaths "
+        "OpenReferenceInstances "
+        "OpenReferenceInstancePaths PullInstancesWithPath PullInstancePaths PullInstances CloseEnumeration");
+    for (std::string operation; needy >> operation;)
+        EXPECT_EQ(status(operation, {}), 4) << operation;
     m_caller.isAdministrator = false;
     EXPECT_EQ(status("DeleteInstance", {{"InstanceName", a}}), 2);
     EXPECT_EQ(statusIn(invoke(a, "Work", {})), 2);
@@ -302,7 +316,8 @@ TEST_F(DispatcherTest, LeavesOneAuditLineForEachChangeAndRefusal) {
                                  R"(arguments="" outcome="denied: user )" + name +
                                  R"( may only read" reason="QX-0502")");
     EXPECT_LT(lines[3].text.size(), 1400U);
-    EXPECT_NE(lines[3].text.find("user=\"" + std::string(64, 'u') + R"(\..." address="192.0.2.1")"), std::string::npos);
+    EXPECT_NE(lines[3].text.find("user=\"" + std::string(64, 'u') + R"(\..." address="192.0.2.1")"),
+              std::string::npos);
     const std::string cut = "=\"denied: user " + std::string(256 - 13, 'u') + R"(\..." reason="QX-0502")";
     EXPECT_TRUE(lines[3].text.ends_with(cut)) << lines[3].text;
 }
