@@ -186,7 +186,7 @@ TEST_F(HostileInputTest, RefusesARequestByItsFault) {
             << answer;
         ++requests;
     }
-    EXPECT_EQ(requests, 32);
+    EXPECT_EQ(requests, 44);
 }
 
 TEST_F(HostileInputTest, SurvivesGarbageInPlaceOfTls) {
