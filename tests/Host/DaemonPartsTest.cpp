@@ -134,6 +134,12 @@ TEST(TlsPrioritiesTest, AreRefusedWhereTheLibraryDoesNotKnowThem) {
                 ThrowsMessage<std::runtime_error>(HasSubstr("Define them in the section [priorities] of /")));
 }
 
+TEST(LockFileTest, IsInAFolderThatAStartMakes) {
+    EXPECT_TRUE(host::isInDefaultFolder("/run/quenx-cimd/socket"));
+    for (const char* elsewhere : {"/run/quenx-cimd/a/b", "/run/quenx-cimx/lock", "quenx-cimd/lock"})
+        EXPECT_FALSE(host::isInDefaultFolder(elsewhere)) << elsewhere;
+}
+
 TEST(ReportTest, TellsTheServiceManagerAndKeepsNoDescriptor) {
     const test::TempFolder folder;
     const auto descriptors = [] { return std::distance(fs::directory_iterator("/proc/self/fd"), {}); };

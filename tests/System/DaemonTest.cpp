@@ -71,6 +71,8 @@ TEST(DaemonTest, ServesEveryClassToRealAndRecordedClients) {
 TEST(DaemonTest, DeletesJobsThatHaveEndedWhenAskedTo) {
     RunningDaemon daemon({"--jobs-keep-seconds", "1"}, {"QUENX_LOG=stderr"});
     const std::string job = startUpdate(daemon);
+    // What its own settings say is no matter of who may delete.
+    daemon.folder().write("policy.toml", "administrators = []\n");
     EXPECT_TRUE(daemon.program().waitFor(
         "quenx: [audit] user=\"quenx-cimd\" address=\"local\" operation=\"DeleteInstance\" "
         "target=\"root/cimv2:Quenx_ConcreteJob.InstanceID=\\\"Quenx:FirmwareUpdate@Job#1\\\"\" "
@@ -276,6 +278,16 @@ TEST(DaemonTest, AsksPamAndTheGroupsOfTheSystem) {
     }
     askInstead("required pam_debug.so auth=authinfo_unavail");
     expectFor("other", "x", kWrong);
+}
+
+TEST(DaemonTest, MakesTheFolderOfItsLockAndSocket) {
+    if (!canMount()) GTEST_SKIP() << "nothing can be mounted";
+    const test::TempFolder run;
+    const RunningDaemon daemon(
+        {"--daemon-lock-file", "/run/quenx-cimd/other", "--listen-socket", "/run/quenx-cimd/socket"}, {},
+        withOwnMounts({"mount --bind $0 /run && exec \"$@\"", run.path()}));
+    EXPECT_EQ(std::filesystem::status(run / "quenx-cimd").permissions(), std::filesystem::perms(0700));
+    EXPECT_TRUE(std::filesystem::is_socket(run / "quenx-cimd/socket"));
 }
 
 class DaemonSessionTest : public ::testing::TestWithParam<const char*> {
