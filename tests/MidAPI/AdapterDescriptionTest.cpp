@@ -11,7 +11,8 @@
 
 namespace {
 
-using ::testing::HasSubstr;
+using ::testing::Matcher;
+using ::testing::StartsWith;
 using ::testing::ThrowsMessage;
 
 std::string adapterAt(const std::string& address) {
@@ -79,8 +80,11 @@ TEST(AdapterDescriptionTest, NamesMistakesWithPlaceAndRemedy) {
         const std::size_t text = sample.find('\n', begin) + 1;
         end = sample.find("\n=== ", text);
         const std::string said = sample.substr(begin + 4, text - 1 - (begin + 4));
+        // What follows a colon at the end is in the words of the library that reads TOML.
+        const Matcher<std::string> whole =
+            said.ends_with(": ") ? Matcher<std::string>(StartsWith(said)) : said;
         EXPECT_THAT([&] { ma::parseAdapterDescriptions(sample.substr(text, end - text), "a.toml"); },
-                    ThrowsMessage<ma::AdapterError>(HasSubstr(said)));
+                    ThrowsMessage<ma::AdapterError>(whole));
     }
 }
 
@@ -91,15 +95,20 @@ TEST(AdapterDescriptionTest, NamesFilesThatCannotBeUsed) {
     const auto naming = [&](const std::string& file) {
         return folder.write(file + ".toml", adapterWith("flash_file = \"" + file + "\""));
     };
+    const std::string own = "adapter eth0: its flash_file " + folder / "";
     const std::pair<std::string, std::string> table[] = {
-        {folder / "none.toml", "there is no adapter description"},
-        {folder.path(), "cannot read " + folder.path()},
-        {naming("missing.rom"), "missing.rom is not there"},
-        {naming("card.rom"), "is not an intact ROM image: image 1 at 0x0"},
-        {naming("fifo"), "the file is empty"}};
+        {folder / "none.toml",
+         "there is no adapter description " + folder / "none.toml" + "; name a readable file"},
+        {folder.path(), "the adapter description: cannot read " + folder.path() + ": Is a directory"},
+        {naming("missing.rom"), own + "missing.rom is not there; name an expansion ROM file"},
+        {naming("card.rom"),
+         own + "card.rom is not an intact ROM image: image 1 at 0x0: the signature 55 AA is "
+               "missing (offset 0x0)"},
+        {naming("fifo"),
+         own + "fifo is not an intact ROM image: image 1 at 0x0: the file is empty (offset 0x0)"}};
     for (const auto& [description, expected] : table) {
         EXPECT_THAT([&file = description] { ma::Simulator(file, "state"); },
-                    ThrowsMessage<ma::AdapterError>(HasSubstr(expected)));
+                    ThrowsMessage<ma::AdapterError>(expected));
     }
 }
 
