@@ -107,7 +107,6 @@ struct Trouble {
     int status;
     std::string log;
     std::uint32_t code;
-    std::string text;
 };
 
 auto failing(const std::string& operation, int error) {
@@ -120,33 +119,33 @@ auto ending(int error, const std::string& text) {
     };
 }
 
-void expectBefore(const Trouble& trouble) {
+/// What is said of the adapter before a write, in two lines.
+std::string saidBefore(const Trouble& trouble) {
     const test::SyslogCapture log;
     const test::DevlinkBench bench;
     trouble.spoil(*bench.kernel, bench.device());
     EXPECT_EQ(trouble.canBeUpdated, ma::getCanBeUpdated(bench.first));
     const std::string search = ma::describeSearch();
-    EXPECT_THAT(search, HasSubstr(": 2 were found."));
     EXPECT_EQ(trouble.canBeUpdated,
               search.find(bench.first + " (fake) cannot be updated: ") == std::string::npos)
         << search;
     const auto verdict = ma::judgeImage(bench.first, bench.image, {});
     EXPECT_EQ(trouble.status, verdict->status);
-    EXPECT_THAT(verdict->reason, HasSubstr(trouble.log));
     EXPECT_EQ(trouble.status, bench.prepare());
     EXPECT_TRUE(trouble.log.empty() || log.contains(trouble.log)) << trouble.log;
     EXPECT_EQ(2U, ma::enumerateAdapters().size());
+    return search + "\n" + verdict->reason + "\n";
 }
 
-void expectDuring(const Trouble& trouble) {
+/// What is said of the write.
+std::string saidDuring(const Trouble& trouble) {
     const test::DevlinkBench bench;
-    ASSERT_EQ(0, bench.prepare());
+    EXPECT_EQ(0, bench.prepare());
     const auto devices = bench.kernel->devices;
     trouble.spoil(*bench.kernel, bench.device());
     const test::WriteResult result = bench.write();
     EXPECT_EQ(trouble.code == 0, result.done);
     EXPECT_EQ(trouble.code, result.code);
-    EXPECT_THAT(result.text, HasSubstr(trouble.text));
     EXPECT_THAT(bench.staged(), testing::IsEmpty());
     EXPECT_EQ(result.done, ma::getFlashImageUpdateProgress(bench.first) == 100);
 
@@ -156,58 +155,50 @@ void expectDuring(const Trouble& trouble) {
     bench.kernel->hasDevlink = bench.kernel->isPermitted = true;
     bench.kernel->devices = devices;
     EXPECT_TRUE(bench.write().done) << "nothing is held";
+    return result.text + "\n";
 }
 
 TEST(DevlinkFlashTest, TellsWhatIsWrongAndLeavesNothingBehind) {
     using enum ma::PrepareStatus;
     using enum ma::WriteError;
     const std::vector<Trouble> troubles = {
-        {[](auto&, auto&) {}, true, Prepared, "", 0, ""},
-        {[](auto&, auto& device) { device.hasInfo = false; }, true, Prepared, "", 0, ""},
-        {[](auto&, auto& device) { device.hasFlash = false; }, false, ImageNotSupported, "", NotUpdatable,
-         "does not offer updates"},
+        {[](auto&, auto&) {}, true, Prepared, "", 0},
+        {[](auto&, auto& device) { device.hasInfo = false; }, true, Prepared, "", 0},
+        {[](auto&, auto& device) { device.hasFlash = false; }, false, ImageNotSupported, "", NotUpdatable},
         {[](auto&, auto& device) { device.infoError = EIO; }, true, UnspecifiedError,
-         "versions of adapter 0000:05:00.0 cannot be read: Input/output error", 0, ""},
+         "versions of adapter 0000:05:00.0 cannot be read: Input/output error", 0},
         {[](auto& kernel, auto&) { kernel.devices.erase("0000:05:00.0"); }, false, ImageNotSupported, "",
-         NotUpdatable, "devlink does not know it"},
-        {[](auto& kernel, auto&) { kernel.hasDevlink = false; }, false, ImageNotSupported, "", NotUpdatable,
-         "no devlink"},
+         NotUpdatable},
+        {[](auto& kernel, auto&) { kernel.hasDevlink = false; }, false, ImageNotSupported, "", NotUpdatable},
         {[](auto& kernel, auto&) { kernel.isPermitted = false; }, false, UnspecifiedError, "run it as root",
-         DeviceFailed, "run it as root"},
+         DeviceFailed},
         {[](auto& kernel, auto&) { kernel.mangle = [](test::Datagram& datagram) { datagram.resize(1); }; },
-         false, UnspecifiedError, "does not say whether it has devlink", DeviceFailed,
-         "does not say whether it has devlink"},
+         false, UnspecifiedError, "does not say whether it has devlink", DeviceFailed},
         {[](auto& kernel, auto&) { kernel.readOnly.insert("/lib/firmware"); }, true, UnspecifiedError,
-         "/lib/firmware", EACCES, "/lib/firmware"},
-        {failing("openNetlink", EMFILE), false, UnspecifiedError, "Too many open files", DeviceFailed,
-         "openNetlink: Too many open files"},
-        {failing("joinGroup", EPERM), false, UnspecifiedError, "Operation not permitted", DeviceFailed,
-         "joinGroup: Operation not permitted"},
-        {failing("send", ENOBUFS), false, UnspecifiedError, "No buffer space", DeviceFailed,
-         "send: No buffer space available"},
-        {ending(EIO, "erasing bank 1 failed"), true, Prepared, "", DeviceFailed,
-         "the update failed: erasing bank 1 failed (Input/output error); the flash holds fw 1.2.3"},
-        {ending(EIO, ""), true, Prepared, "", DeviceFailed,
-         "Input/output error; the driver's last words were: Flashing done"},
-        {ending(ENOENT, "failed to locate the requested firmware file"), true, Prepared, "", DeviceFailed,
-         "outside a container"},
+         "/lib/firmware", EACCES},
+        {failing("openNetlink", EMFILE), false, UnspecifiedError, "Too many open files", DeviceFailed},
+        {failing("joinGroup", EPERM), false, UnspecifiedError, "Operation not permitted", DeviceFailed},
+        {failing("send", ENOBUFS), false, UnspecifiedError, "No buffer space", DeviceFailed},
+        {ending(EIO, "erasing bank 1 failed"), true, Prepared, "", DeviceFailed},
+        {ending(EIO, ""), true, Prepared, "", DeviceFailed},
+        {ending(ENOENT, "failed to locate the requested firmware file"), true, Prepared, "", DeviceFailed},
         // Of the driver's own, which say nothing of rights, places or folders.
-        {ending(ENODEV, "bank 1"), true, Prepared, "", ENODEV, "bank 1 (No such device); the flash"},
-        {ending(ENOENT, "section 7"), true, Prepared, "", DeviceFailed,
-         "section 7 (No such file or directory); the flash"},
-        {failing("makeFolder", EROFS), true, Prepared, "", DeviceFailed, "makeFolder: Read-only file"},
-        {failing("lock", EACCES), true, Prepared, "", DeviceFailed, "lock: Permission denied"},
-        {failing("createFile", EROFS), true, Prepared, "", EROFS,
-         "staged in /lib/firmware/quenx: Read-only file"},
-        {failing("writeFile", ENOSPC), true, Prepared, "", ENOSPC, "staged in /lib/firmware/quenx: No space"},
-        {failing("syncFile", EIO), true, Prepared, "", DeviceFailed, "/lib/firmware/quenx: Input/output"},
-        {failing("syncFolder", EIO), true, Prepared, "", DeviceFailed, "/lib/firmware/quenx: Input/output"},
+        {ending(ENODEV, "bank 1"), true, Prepared, "", ENODEV},
+        {ending(ENOENT, "section 7"), true, Prepared, "", DeviceFailed},
+        {failing("makeFolder", EROFS), true, Prepared, "", DeviceFailed},
+        {failing("lock", EACCES), true, Prepared, "", DeviceFailed},
+        {failing("createFile", EROFS), true, Prepared, "", EROFS},
+        {failing("writeFile", ENOSPC), true, Prepared, "", ENOSPC},
+        {failing("syncFile", EIO), true, Prepared, "", DeviceFailed},
+        {failing("syncFolder", EIO), true, Prepared, "", DeviceFailed},
     };
+    std::string said;
     for (const Trouble& trouble : troubles) {
-        SCOPED_TRACE(trouble.text);
-        expectBefore(trouble);
-        expectDuring(trouble);
+        SCOPED_TRACE(said);
+        said += saidBefore(trouble) + saidDuring(trouble) + "\n";
     }
+    const auto expected = test::readTestFile(QUENX_MIDAPI_TEST_DIR "/samples/devlink-troubles");
+    EXPECT_EQ(said, std::string(expected.begin(), expected.end()));
 }
 
 TEST(DevlinkFlashTest, WritesOnlyWhatWasPreparedForTheAdapter) {
@@ -251,7 +242,9 @@ TEST(DevlinkFlashTest, ReadsFromTheFlashWhatALostAcknowledgementWouldHaveTold) {
         const test::WriteResult result = bench.install();
         EXPECT_EQ(each.done, result.done) << each.text;
         EXPECT_EQ(each.done ? 0 : ETIMEDOUT, static_cast<int>(result.code)) << each.text;
-        EXPECT_THAT(result.text, HasSubstr(each.text));
+        EXPECT_EQ(result.text, each.done ? ""
+                                         : "the kernel did not tell how the update ended; " + each.text +
+                                               "; look at the adapter's versions, and update it again");
         EXPECT_EQ(each.done, ma::getFlashImageUpdateProgress(bench.first) == 100);
     }
     // What was not known before has not changed by being known now.
