@@ -66,21 +66,23 @@ TEST_F(KeysTest, AreRefusedWhereOthersCouldChangeThem) {
 
 TEST_F(KeysTest, AreRefusedWhereTheyAreSomethingElse) {
     const auto expect = [this](const std::string& text) {
-        EXPECT_TRUE(test::contains(problem(), text)) << problem();
+        EXPECT_TRUE(problem().ends_with(text)) << problem();
     };
     fs::rename(file, workshop / "moved.pem");
     fs::create_symlink(workshop / "moved.pem", file);
-    expect("acme.pem: it is a symbolic link");
+    expect("/acme.pem: it is a symbolic link, which others may turn; put the certificate itself there");
     fs::remove(file);
     fs::create_directory(file);
-    expect("acme.pem: it is not a regular file");
+    expect("/acme.pem: it is not a regular file; put a certificate there, or remove it");
     fs::remove(file);
     workshop.folder.write("keys/acme.pem", "-----BEGIN CERTIFICATE-----\nMIIB\n-----END CERTIFICATE-----\n");
-    expect("acme.pem: it is no certificate");
+    expect(
+        "/acme.pem: it is no certificate (ASN1 parser: Error in DER parsing.); put one there in PEM or DER, "
+        "or remove it");
     workshop.folder.write("keys/acme.pem", std::string((64 << 10) + 1, ' '));
-    expect("acme.pem: it is larger than 64 KiB");
+    expect("/acme.pem: it is larger than 64 KiB; put one certificate there");
     fs::remove_all(workshop.keys);
-    expect("there is no such folder; make it");
+    expect("/keys: there is no such folder; make it, and put the certificates there that are trusted");
 }
 
 TEST_F(KeysTest, AreNotMoreThanCanBeTried) {
