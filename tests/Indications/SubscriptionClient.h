@@ -20,6 +20,8 @@ struct CimAnswer {
     std::string description;
     pugi::xml_document document;
 
+    /// Both in one text.
+    std::string said() const { return std::to_string(error) + " " + description; }
     pugi::xml_node result() const { return document.select_node("//IRETURNVALUE").node(); }
 };
 
