@@ -2,6 +2,9 @@
 // quenx-cimd tells listeners what happens to its jobs.
 #include <gmock/gmock.h>
 
+#include <chrono>
+#include <thread>
+
 #include "Indications/OneUpdate.h"
 #include "Indications/SubscriptionClient.h"
 #include "Indications/Told.h"
@@ -169,6 +172,47 @@ TEST(ServedIndicationsTest, SayWhatIsWrongWithASubscriptionAndKeepNothingOfIt) {
     EXPECT_EQ(filter(kAll), "2 user guest may only read");
     EXPECT_EQ(client.remove(made).said(), "2 user guest may only read");
     EXPECT_EQ(client.value(made, "Name"), "f");
+}
+
+TEST(ServedIndicationsTest, KeepNoMoreThanTheSettingsSay) {
+    const RunningDaemon daemon({"--indications-most", "2"});
+    const SubscriptionClient client(daemon);
+    std::vector<std::string> filters;
+    std::vector<std::string> destinations;
+    for (const char* name : {"1", "2", "3", "4"})
+        filters.push_back(client.madeFilter(kAll, name));
+    for (const char* name : {"1", "2"})
+        destinations.push_back(client.madeDestination("http://localhost:9", name));
+    const auto subscribe = [&](const std::string& filter, const std::string& more = "") {
+        return client.create("CIM_IndicationSubscription",
+                             client.reference("Filter", client.local(filter)) +
+                                 client.reference("Handler", client.local(destinations[0])) + more);
+    };
+    const std::string limited = SubscriptionClient::property("SubscriptionDuration", "uint64", "1");
+    EXPECT_EQ(subscribe(filters[0], limited).said(), "0 ");
+    EXPECT_EQ(subscribe(filters[1]).said(), "0 ");
+    EXPECT_EQ(subscribe(filters[1]).error, 11);
+    EXPECT_EQ(
+        client.create("CIM_IndicationFilter", SubscriptionClient::filterProperties(kAll, "WQL", "5")).said(),
+        "27 there are 4 filters already, the most that are kept");
+    EXPECT_EQ(client
+                  .create("CIM_IndicationHandlerCIMXML",
+                          SubscriptionClient::keys("CIM_IndicationHandlerCIMXML", "3") +
+                              SubscriptionClient::property("Destination", "string", "http://localhost:9"))
+                  .said(),
+              "27 there are 2 destinations already, the most that are kept");
+    // One that has ended makes room.
+    while (client.count("CIM_IndicationSubscription") == 2)
+        std::this_thread::sleep_for(std::chrono::milliseconds(20));
+    EXPECT_EQ(subscribe(filters[2]).said(), "0 ");
+    EXPECT_EQ(subscribe(filters[3]).said(), "27 there are 2 subscriptions already, the most that are kept");
+    EXPECT_EQ(client.remove(filters[0]).said(), "0 ") << "what referred to it has ended";
+    const test::CimAnswer inUse = client.remove(filters[1]);
+    EXPECT_EQ(inUse.error, 1);
+    EXPECT_THAT(inUse.description, testing::EndsWith("; delete that first"));
+    EXPECT_EQ(client.remove(destinations[1]).said(), "0 ");
+    EXPECT_THAT(client.remove(destinations[1]).description, testing::EndsWith(" names no instance"));
+    EXPECT_EQ(client.count("CIM_ListenerDestination"), 1U);
 }
 
 TEST(ServedIndicationsTest, UnderstandOlderClients) {
