@@ -3,8 +3,11 @@
 
 #include <gtest/gtest.h>
 #include <sys/stat.h>
+#include <unistd.h>
 
 #include <filesystem>
+#include <functional>
+#include <system_error>
 
 #include "MidAPI/ma.h"
 #include "Support/SimulatedAdapters.h"
@@ -190,6 +193,33 @@ TEST_F(FlashStoreTest, ClosesItsFilesToOtherUsers) {
     fs::create_symlink(m_adapters.folder() / "elsewhere", m_adapters.stateDirectory() + "/eth0");
     EXPECT_EQ(test::writeImage("eth0", test::madeRom({{PXE, 4}})).code, ma::WriteError::DeviceFailed);
     EXPECT_EQ(test::componentsOf("eth0"), "IMG_PXE 3, IMG_UEFI 0");
+}
+
+TEST(FlashFilesTest, SayWhatTheyCannotDo) {
+    const test::TempFolder folder;
+    ma::FlashFiles files;
+    const auto saidBy = [](const std::function<void()>& step) {
+        try {
+            step();
+        } catch (const std::system_error& error) {
+            return std::string(error.what());
+        }
+        return std::string();
+    };
+    const std::string none = folder / "none/it";
+    EXPECT_EQ(saidBy([&] { files.makeFolder(none); }),
+              "cannot make the folder " + none + ": No such file or directory");
+    EXPECT_EQ(saidBy([&] { files.makeFolder(folder.path()); }), "") << "it is there";
+    EXPECT_EQ(saidBy([&] { files.create(none); }),
+              "cannot write the file " + none + ": No such file or directory");
+    const Bytes bytes(1);
+    EXPECT_EQ(saidBy([&] { files.write(-1, bytes); }), "cannot write to the flash: Bad file descriptor");
+    EXPECT_EQ(saidBy([&] { files.sync(-1); }), "cannot bring the flash to the medium: Bad file descriptor");
+    EXPECT_EQ(saidBy([&] { files.rename(none, folder / "x"); }),
+              "cannot rename " + none + ": No such file or directory");
+    folder.write("file", "long");
+    ::close(files.create(folder / "file"));
+    EXPECT_EQ(fs::file_size(folder / "file"), 0U);
 }
 
 }  // namespace
