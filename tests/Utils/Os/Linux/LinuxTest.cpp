@@ -7,6 +7,7 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include <array>
 #include <chrono>
 #include <csignal>
 #include <system_error>
@@ -16,6 +17,7 @@
 #include "Support/TempFolder.h"
 #include "Utils/Exception.h"
 #include "Utils/Os/Linux/OwnFiles.h"
+#include "Utils/Os/Linux/PatientReading.h"
 
 TEST(FileSizeTest, FailsForUnreadableFilesAndDescriptorZero) {
     const test::TempFolder folder;
@@ -90,4 +92,65 @@ TEST(LinuxTest, ReadsWholeFilesUpToALimit) {
     EXPECT_THAT(
         [&] { os::readWholeFile(folder.path(), 10); },
         testing::ThrowsMessage<std::system_error>("cannot read " + folder.path() + ": Is a directory"));
+}
+
+TEST(LinuxTest, ReadsTextsThatArePlainFiles) {
+    const test::TempFolder folder;
+    const std::string large(std::size_t{1} << 20, 'x');
+    EXPECT_EQ(os::readTextFile(folder.write("large", large)), large);
+    EXPECT_EQ(os::readTextFile(folder / "none"), std::nullopt);
+    folder.write("larger", large + "x");
+    ASSERT_EQ(mkfifo((folder / "fifo").c_str(), 0600), 0);
+    for (const auto& each : {std::pair(folder / "larger", "is larger than 1 MiB"),
+                             {folder / "fifo", "is not a regular file"},
+                             {std::string("/dev/zero"), "is not a regular file"}}) {
+        EXPECT_THAT([&] { os::readTextFile(each.first); },
+                    testing::ThrowsMessage<os::UnusableFile>(std::string(each.second)));
+        EXPECT_EQ(os::isSpecialFile(each.first), !each.first.ends_with("larger"));
+    }
+    EXPECT_FALSE(os::isSpecialFile(folder.path()) || os::isSpecialFile(folder / "none"));
+    EXPECT_TRUE(os::isThisADir(folder.path()));
+    EXPECT_FALSE(os::isThisADir(folder / "large"));
+    EXPECT_EQ(os::listDirectory(folder.path()), (utils::StringArray{"fifo", "large", "larger"}));
+    EXPECT_TRUE(os::listDirectory(folder / "large").empty());
+}
+
+TEST(FileSizeTest, SaysWhatIsNoFile) {
+    const test::LogLevelGuard guard(0);
+    const test::TempFolder folder;
+    const auto saidOf = [](const std::string& path) {
+        try {
+            return std::to_string(os::getFileSize(path));
+        } catch (const utils::Exception& error) {
+            return std::string(error.what());
+        }
+    };
+    const std::string file = folder.write("file", "12345");
+    EXPECT_EQ(saidOf(file), "5");
+    EXPECT_EQ(saidOf(folder / "none"), "SMASHv2:Could not open the file " + folder / "none");
+    EXPECT_EQ(saidOf(folder.path()), "SMASHv2:The specyfied URI " + folder.path() + " points to a directory");
+    EXPECT_EQ(saidOf("/dev/null"), "SMASHv2:Could not open the file /dev/null");
+    os::FileLook look;
+    look.kind = os::FileKind::Regular;
+    look.size = INT32_MAX;
+    EXPECT_EQ(os::getFileSize(file, look), INT32_MAX);
+    ++look.size;
+    EXPECT_THROW(os::getFileSize(file, look), utils::Exception);
+    look.kind = os::FileKind::CannotBeLookedAt;
+    EXPECT_THAT([&] { os::getFileSize("F", look); },
+                testing::ThrowsMessage<utils::Exception>("SMASHv2:Could not get info about the file F"));
+    std::array<std::uint8_t, 8> bytes{};
+    EXPECT_EQ(os::readFile(file, bytes), 5U);
+    EXPECT_EQ(os::readFile(file, std::span(bytes).first(3)), 3U);
+    EXPECT_EQ(os::readFile(folder.path(), bytes) + os::readFile("/dev/zero", bytes), 0U);
+}
+
+TEST(LinuxTest, CountsTimeInMicroseconds) {
+    const std::uint64_t epoch = os::getuSecondsSinceEpoch();
+    const std::uint64_t monotonic = os::getMonotonicuSeconds();
+    EXPECT_LE(epoch / 1'000'000, static_cast<std::uint64_t>(time(nullptr)));
+    EXPECT_GE(epoch / 1'000'000 + 100, static_cast<std::uint64_t>(time(nullptr)));
+    std::this_thread::sleep_for(std::chrono::milliseconds(2));
+    EXPECT_GE(os::getMonotonicuSeconds(), monotonic + 2000);
+    EXPECT_GE(os::getuSecondsSinceEpoch() + 1'000'000, epoch);
 }
