@@ -80,9 +80,9 @@ inline const indications::Vocabulary& vocabulary() {
     const auto property = [](const char* name, CimType type, bool isArray = false) {
         return core::PropertyDeclaration{.name = name, .type = type, .isArray = isArray, .isKey = false};
     };
-    const auto object = [&](const char* name) {
+    const auto object = [&](const char* name, const char* qualifier) {
         core::PropertyDeclaration made = property(name, CimType::String);
-        made.qualifiers = {{"EmbeddedObject", core::CimValue::of(CimType::Boolean, true)}};
+        made.qualifiers = {{qualifier, core::CimValue::of(CimType::Boolean, true)}};
         return made;
     };
     const auto declared = [](const char* name, const char* superclass,
@@ -95,9 +95,10 @@ inline const indications::Vocabulary& vocabulary() {
     };
     static const std::vector<core::ClassChain> indicationClasses = core::chainsOf(
         {declared("CIM_Indication", "", {property("IndicationTime", CimType::Datetime)}),
-         declared("CIM_InstIndication", "CIM_Indication", {object("SourceInstance")}),
+         declared("CIM_InstIndication", "CIM_Indication", {object("SourceInstance", "EmbeddedObject")}),
          declared("CIM_InstCreation", "CIM_InstIndication", {}),
-         declared("CIM_InstModification", "CIM_InstIndication", {object("PreviousInstance")})});
+         declared("CIM_InstModification", "CIM_InstIndication",
+                  {object("PreviousInstance", "EmbeddedInstance")})});
     static const std::vector<core::ClassChain> sources = core::chainsOf(
         {declared("CIM_ManagedElement", "", {property("Caption", CimType::String)}),
          declared("CIM_Job", "CIM_ManagedElement", {property("OperationalStatus", CimType::Uint16, true)}),

@@ -14,8 +14,8 @@ namespace {
 
 using core::sameName;
 
-constexpr std::array<std::string_view, 14> kKeywords = {
-    "SELECT", "FROM", "WHERE", "AND", "OR", "NOT", "ISA", "IS", "NULL", "TRUE", "FALSE", "ANY", "AS", "BY"};
+constexpr std::array<std::string_view, 13> kKeywords = {
+    "SELECT", "FROM", "WHERE", "AND", "OR", "NOT", "ISA", "IS", "NULL", "TRUE", "FALSE", "ANY", "BY"};
 
 /// What CQL or a dialect of it has under this word or sign.
 struct Feature {
@@ -77,22 +77,6 @@ std::string shown(const Token& token) {
             return "a value";
         default:
             return "\"" + token.text + "\"";
-    }
-}
-
-/// The relation with its sides exchanged.
-Relation mirrored(Relation relation) {
-    switch (relation) {
-        case Relation::Less:
-            return Relation::Greater;
-        case Relation::LessOrEqual:
-            return Relation::GreaterOrEqual;
-        case Relation::Greater:
-            return Relation::Less;
-        case Relation::GreaterOrEqual:
-            return Relation::LessOrEqual;
-        default:
-            return relation;
     }
 }
 
@@ -229,21 +213,17 @@ Expression Parser::comparison(bool any, Operand left) {
         acceptWord("NOT");  // of NOT LIKE, say
         refuse("a comparison");
     }
-    Relation relation = *found;
     Operand right = operand();
     if (hasEveryElement(right)) refuseAt(place, "ANY and [*] stand on the left side only");
     // A value that is null stands on the right from here on.
-    if (std::holds_alternative<Null>(left)) {
-        std::swap(left, right);
-        relation = mirrored(relation);
-    }
+    if (std::holds_alternative<Null>(left)) std::swap(left, right);
     if (!std::holds_alternative<Null>(right))
-        return {Comparison{any, std::move(left), relation, std::move(right)}};
+        return {Comparison{any, std::move(left), *found, std::move(right)}};
     const Path* const path = std::get_if<Path>(&left);
-    const bool isEquality = relation == Relation::Equal || relation == Relation::NotEqual;
+    const bool isEquality = *found == Relation::Equal || *found == Relation::NotEqual;
     if (path == nullptr || any || !isEquality)
         refuseAt(place, "NULL is compared by IS NULL or IS NOT NULL only, and with a property");
-    return {NullTest{*path, relation == Relation::NotEqual}};
+    return {NullTest{*path, *found == Relation::NotEqual}};
 }
 
 std::optional<Relation> Parser::relation() {
