@@ -40,7 +40,8 @@ AddressPolicy toNetworks(std::initializer_list<const char*> texts) {
 TEST(AddressPolicyTest, LetsIndicationsGoToTheSubscriberAlone) {
     const auto policy = AddressPolicy::onlyTo(machineAddress("192.0.2.7").value());
     EXPECT_TRUE(allows(policy, "192.0.2.7") && allows(policy, "::ffff:192.0.2.7"));
-    EXPECT_TRUE(allows(policy, "192.0.2.7", 80) && allows(policy, "192.0.2.7", 443));
+    EXPECT_TRUE(allows(policy, "192.0.2.7", 80) && allows(policy, "192.0.2.7", 443) &&
+                allows(policy, "192.0.2.7", 1024));
     EXPECT_FALSE(allows(policy, "192.0.2.7", 22) || allows(policy, "192.0.2.7", 1023));
     EXPECT_FALSE(allows(policy, "192.0.2.8") || allows(policy, "127.0.0.1") || allows(policy, "::1"));
     const auto local = AddressPolicy::onlyTo(machineAddress("::1").value());
@@ -53,11 +54,14 @@ TEST(AddressPolicyTest, LetsThemGoNowhereThatIsNoOtherMachine) {
     const MachineAddress elsewhere = machineAddress("198.51.100.4").value();
     const auto policies = {AddressPolicy::anywhere(elsewhere), toNetworks({"0.0.0.0/0", "::/0"})};
     for (const AddressPolicy& policy : policies) {
-        EXPECT_TRUE(allows(policy, "192.0.2.7") && allows(policy, "2001:db8::1") &&
-                    allows(policy, "10.0.0.1"));
         for (const char* address :
-             {"127.0.0.1", "::1", "::ffff:127.0.0.1", "0.0.0.0", "::", "224.0.0.1", "ff02::1",
-              "255.255.255.255", "169.254.169.254", "::ffff:169.254.169.254", "fe80::1"})
+             {"192.0.2.7", "2001:db8::1", "1.0.0.0", "126.255.255.255", "128.0.0.0", "169.253.255.255",
+              "169.255.0.0", "223.255.255.255", "::2", "fe7f::1", "fec0::1", "feff::1"})
+            EXPECT_TRUE(allows(policy, address)) << address;
+        for (const char* address :
+             {"127.0.0.1", "::1", "::ffff:127.0.0.1", "127.255.255.255", "0.0.0.0", "0.255.255.255",
+              "::", "224.0.0.1", "ff02::1", "255.255.255.255", "169.254.0.0", "169.254.169.254",
+              "::ffff:169.254.169.254", "fe80::1", "febf::1"})
             EXPECT_FALSE(allows(policy, address)) << address;
     }
     sockaddr local{};
@@ -76,6 +80,8 @@ TEST(AddressPolicyTest, ObeysAListOfNetworks) {
     EXPECT_FALSE(allows(policy, "2001:db8:8::1"));
     EXPECT_TRUE(allows(policy, "127.0.0.1"));
     EXPECT_FALSE(allows(policy, "127.0.0.2"));
+    for (const char* right : {"192.0.2.0/32", "192.0.2.0/0", "::/128"})
+        EXPECT_TRUE(networkIn(right).has_value()) << right;
     for (const char* wrong :
          {"", "h", "192.0.2.0/33", "192.0.2.0/", "192.0.2.0/-1", "::/129", "1.2.3/8", "/8"})
         EXPECT_FALSE(networkIn(wrong).has_value()) << wrong;

@@ -107,20 +107,26 @@ TEST(DeliveryTest, BringsEverythingInItsOrder) {
 }
 
 TEST(DeliveryTest, SendsOneAddressABurstAndThenSoManyASecond) {
+    using std::chrono::milliseconds;
     using std::chrono::seconds;
+    using Moment = indications::Clock::time_point;
     indications::Pace pace(20);
-    const indications::Clock::time_point begin{seconds(1000)};
-    for (int i = 0; i < 600; ++i) {
-        ASSERT_LE(pace.next("192.0.2.1"), begin) << i;
+    const Moment begin{seconds(1000)};
+    EXPECT_EQ(pace.next("192.0.2.1"), Moment());
+    for (int i = 1; i <= 601; ++i) {
         pace.count("192.0.2.1", begin);
+        ASSERT_EQ(pace.next("192.0.2.1"), begin - seconds(30) + milliseconds(50) * i);
     }
-    pace.count("192.0.2.1", begin);
-    EXPECT_GT(pace.next("192.0.2.1"), begin);
-    EXPECT_LE(pace.next("192.0.2.1"), begin + std::chrono::milliseconds(51));
-    EXPECT_LE(pace.next("192.0.2.2"), begin);
+    EXPECT_EQ(pace.next("192.0.2.2"), Moment());
     // After half a minute without any, all of it is there again.
     pace.count("192.0.2.1", begin + seconds(61));
-    EXPECT_LE(pace.next("192.0.2.1"), begin + seconds(32));
+    EXPECT_EQ(pace.next("192.0.2.1"), begin + seconds(31) + milliseconds(50));
+    // Nothing is counted of an address that is not known yet, nor where no bound is set.
+    pace.count("", begin);
+    EXPECT_EQ(pace.next(""), Moment());
+    indications::Pace free(0);
+    free.count("192.0.2.1", begin);
+    EXPECT_EQ(free.next("192.0.2.1"), Moment());
 }
 
 TEST(DeliveryTest, TriesAgainWhatMayHelp) {
@@ -328,26 +334,48 @@ TEST(DeliveryTest, TrustsCertificatesThatAnAuthorityKnowsUnderTheNameOfTheListen
 }
 
 TEST(DeliveryTest, TakesUrlsOfListenersOnly) {
-    using indications::requireDestination;
-    const auto isTaken = [](const std::string& url) {
+    const std::string root = "http://h/";
+    const std::string noUrl = "is no URL: ";
+    const std::string odd = "holds a blank or a character that is none of a URL";
+    const std::string secrets = "holds a name or a password, which everybody could read";
+    const struct {
+        std::string url;
+        std::string refusal;  ///< empty for none; what curl says follows noUrl
+    } cases[] = {
+        {"http://h:5000", ""},
+        {"https://h.example/CIMListener/x", ""},
+        {"h:5000", ""},
+        {"10.0.0.1:5988/a", ""},
+        {"HTTP://[2001:db8::1]:5000/~!", ""},
+        {root + std::string(1024 - root.size(), 'a'), ""},
+        {root + std::string(1025 - root.size(), 'a'), "is longer than 1024 bytes"},
+        {"", "is empty"},
+        {"file:///etc/passwd", "has the scheme file"},
+        {"gopher://h:70/x", "has the scheme gopher"},
+        {"http://user:secret@h:5000/", secrets},
+        {"http://:secret@h:5000/", secrets},
+        {"http://user@h/", secrets},
+        {"http://h/a b", odd},
+        {"http://h/\r\nX: y", odd},
+        {"http://h/\x7F", odd},
+        {"http://h:99999/", noUrl},
+        {"http://", noUrl},
+    };
+    for (const auto& each : cases) {
+        std::string refusal;
         try {
-            requireDestination(url);
-            return true;
+            indications::requireDestination(each.url);
         } catch (const core::CimError& error) {
             EXPECT_EQ(error.status(), core::CimStatus::InvalidParameter);
-            EXPECT_EQ(std::string(error.what()).find("secret"), std::string::npos);
-            return false;
+            refusal = error.what();
         }
-    };
-    for (const char* url : {"http://h:5000", "https://h.example/CIMListener/x", "h:5000", "10.0.0.1:5988/a",
-                            "HTTP://[2001:db8::1]:5000/"})
-        EXPECT_TRUE(isTaken(url)) << url;
-    for (const std::string& url :
-         {std::string(), std::string("file:///etc/passwd"), std::string("gopher://h:70/x"),
-          std::string("http://user:secret@h:5000/"), std::string("http://user@h/"),
-          std::string("http://h:99999/"), std::string("http://h/a b"), std::string("http://h/\r\nX: y"),
-          std::string("http://"), "http://h/" + std::string(1024, 'a')})
-        EXPECT_FALSE(isTaken(url)) << url;
+        const std::string end = "; write it as http://host:port/path or https://...";
+        const bool isCurls = each.refusal == noUrl;
+        const std::string expected =
+            each.refusal.empty() ? "" : "Destination " + each.refusal + (isCurls ? "" : end);
+        EXPECT_EQ(isCurls ? refusal.substr(0, expected.size()) : refusal, expected) << each.url;
+        EXPECT_EQ(refusal.ends_with(end), !refusal.empty()) << refusal;
+    }
 }
 
 }  // namespace
