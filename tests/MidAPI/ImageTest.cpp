@@ -29,6 +29,42 @@ void mend(Rom& image) {
     image[ma::rom::kHeaderChecksum] = static_cast<std::uint8_t>(image[ma::rom::kHeaderChecksum] - sum);
 }
 
+// A flash that was never written to is made anew at each start, and must be the one that it was.
+TEST(OptionRomTest, MakesTheSameImagesInEveryVersion) {
+    const auto sumOf = [](ma::NewRomImage wanted) {
+        wanted.vendorId = 0x1af4;
+        wanted.deviceId = 0x1041;
+        wanted.codeRevision = 0x0102;
+        return ma::crc32(ma::makeRomImage(wanted));
+    };
+    EXPECT_EQ(0x4CC7F4EDU, sumOf({.type = PXE, .furtherDeviceIds = {0x1000, 0x1042}, .length = 1025}));
+    EXPECT_EQ(0xDB2FF73DU, sumOf({.type = PXE, .furtherDeviceIds = std::vector<std::uint16_t>(65, 7)}));
+    EXPECT_EQ(0xB22184A6U, sumOf({.type = iSCSI, .furtherDeviceIds = {}, .clp = true, .length = 0}));
+    EXPECT_EQ(0xE957D3B4U,
+              sumOf({.type = FCoE, .furtherDeviceIds = {}, .length = 256 * 512, .classCode = 0x123456}));
+    EXPECT_EQ(0xAE5827B9U, sumOf({.type = UEFI, .furtherDeviceIds = {}, .clp = true}));
+    EXPECT_EQ(0x4018C716U, sumOf({.type = CLP, .furtherDeviceIds = {}}));
+}
+
+TEST(OptionRomTest, ReadsPrintableTextsOfBoundedLength) {
+    Rom rom = test::madeRom({{PXE, 1}});
+    const ma::RomImage made = ma::parseOptionRom(rom).images.at(0);
+    EXPECT_EQ("Simulator", made.manufacturer);
+    EXPECT_EQ("Simulated PXE boot", made.product);
+    std::fill_n(rom.begin() + 0x70, 256, 'x');
+    const Rom edges = test::bytesOf("1f 20 7e 7f 80");
+    std::ranges::copy(edges, rom.begin() + 0x70);
+    mend(rom);
+    EXPECT_EQ("? ~??" + std::string(250, 'x'), ma::parseOptionRom(rom).images.at(0).product);
+    // Up to the end of the image, and none at all.
+    std::ranges::copy(std::string_view("end"), rom.end() - 3);
+    ma::writeLe16(rom, 0x40 + ma::rom::kPnpProduct, 0x3FD);
+    ma::writeLe16(rom, 0x40 + ma::rom::kPnpManufacturer, 0);
+    mend(rom);
+    EXPECT_EQ("end", ma::parseOptionRom(rom).images.at(0).product);
+    EXPECT_EQ("", ma::parseOptionRom(rom).images.at(0).manufacturer);
+}
+
 TEST(OptionRomTest, TellsTypesByCodeProductAndClpEntry) {
     EXPECT_EQ("IMG_CLP 777, IMG_PXE 777",
               test::describeRom(test::withRevision(test::madeRom({{CLP, 7}}), 777)));
@@ -137,8 +173,9 @@ TEST(ImagePreparationTest, AnswersByTheTable) {
         const test::PreparedImage prepared = test::prepareImage(row[0].substr(0, 4), file, requested);
         EXPECT_EQ(status, prepared.status);
         EXPECT_EQ(written, prepared.types);
-        EXPECT_EQ(status != 0, test::SyslogCapture::contains("status " + std::to_string(status)));
-        EXPECT_TRUE(status == 0 || test::SyslogCapture::contains(row.at(3)));
+        const std::string said = "simulated adapter " + row[0].substr(0, 4) + ": status ";
+        EXPECT_EQ(status == 0 ? "" : said + std::to_string(status) + ": " + row.at(3),
+                  utils::joined(test::SyslogCapture::messages("error")));
         if (status != 0 && status != 3 && status != 4) {
             EXPECT_EQ(file.size(), prepared.image.size()) << "the size was changed";
             continue;
@@ -160,13 +197,20 @@ TEST(ImagePreparationTest, TakesTheLossOfTheClpEntryForAnotherType) {
     EXPECT_EQ(ma::PrepareStatus::Prepared, ma::assessImage(target, test::madeRom({{CLP, 1}}), {PXE}).status);
 }
 
-TEST(ImagePreparationTest, RefusesABufferThatIsTooSmall) {
+TEST(ImagePreparationTest, RefusesABufferThatIsMissingOrTooSmall) {
     const test::SimulatedAdapters adapters;
     const Rom rom = test::madeRom({{PXE, 1}});
     Rom output(rom.size() - 1);
     auto imageSize = static_cast<std::uint32_t>(output.size());
     Types types;
+    const test::SyslogCapture log;
     EXPECT_EQ(1, ma::prepareFlashImage("eth0", rom.data(), imageSize + 1, output.data(), &imageSize, types));
+    for (const auto& [file, into] :
+         {std::pair<const std::uint8_t*, std::uint8_t*>{nullptr, output.data()}, {rom.data(), nullptr}})
+        EXPECT_EQ(1, ma::prepareFlashImage("eth0", file, imageSize, into, &imageSize, types));
+    EXPECT_EQ(1, ma::prepareFlashImage("eth0", nullptr, 0, nullptr, nullptr, types));
+    EXPECT_EQ(utils::StringArray(4, "simulated adapter eth0: status 1: a buffer is missing or too small"),
+              test::SyslogCapture::messages("error"));
 }
 
 }  // namespace
