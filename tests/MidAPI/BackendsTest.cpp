@@ -56,34 +56,43 @@ TEST_F(BackendsTest, AreChosenByWhatIsSaidThenByTheEnvironment) {
     const std::string none = folder.write("none.toml", "");
     const std::string missing = folder / "missing.toml";
     const std::string wrong = folder.write("wrong.toml", "adapter = 1");
+    const std::string ofFive = "Simulated adapters were looked for in " + five + ", which describes 5.";
+    const std::string kinds = "; it must be devlink, simulator or auto";
+    const std::string isEmpty = ": it is empty; give it a value or unset it";
+    const std::string isTwo = "simulated adapters are described in " + five +
+                              ", but the backend is to be devlink; name only one of them";
+    const std::string noFile = "there is no adapter description ";
+    const std::string nameOne = "; name a readable file";
     const struct {
         Values variables;
         ma::BackendChoice choice;
         std::string expected;
     } table[] = {
-        {{{"QUENX_ADAPTERS", five}}, {}, five + ", which describes 5."},
-        {{{"QUENX_ADAPTERS", five}}, {.backend = "auto"}, five + ", which describes 5."},
-        {{{"QUENX_ADAPTERS", five}}, {.description = none}, none + ", which describes 0."},
-        {{{"QUENX_BACKEND", "simulator"}, {"QUENX_ADAPTERS", five}}, {}, five + ", which describes 5."},
-        {{{"QUENX_BACKEND", "simulation"}},
-         {},
-         "QUENX_BACKEND: there is no backend \"simulation\"; it must be "},
-        {{}, {.backend = "simulation"}, "there is no backend \"simulation\"; it must be "},
-        {{{"QUENX_BACKEND", "devlink"}}, {.description = five}, five + ", which describes 5."},
+        {{{"QUENX_ADAPTERS", five}}, {}, ofFive},
+        {{{"QUENX_ADAPTERS", five}}, {.backend = "auto"}, ofFive},
+        {{{"QUENX_ADAPTERS", five}},
+         {.description = none},
+         "Simulated adapters were looked for in " + none + ", which describes 0."},
+        {{{"QUENX_BACKEND", "simulator"}, {"QUENX_ADAPTERS", five}}, {}, ofFive},
+        {{{"QUENX_BACKEND", "simulation"}}, {}, "QUENX_BACKEND: there is no backend \"simulation\"" + kinds},
+        {{}, {.backend = "simulation"}, "there is no backend \"simulation\"" + kinds},
+        {{{"QUENX_BACKEND", "devlink"}}, {.description = five}, ofFive},
         // What was meant to name simulated adapters never leads to real ones.
-        {{{"QUENX_ADAPTERS", ""}}, {}, "QUENX_ADAPTERS: it is empty; "},
-        {{{"QUENX_ADAPTERS", missing}}, {}, "QUENX_ADAPTERS: there is no adapter description " + missing},
-        {{{"QUENX_ADAPTERS", wrong}}, {.backend = "auto"}, "QUENX_ADAPTERS: " + wrong},
-        {{{"QUENX_BACKEND", ""}, {"QUENX_ADAPTERS", five}}, {}, "QUENX_BACKEND: it is empty; "},
-        {{{"QUENX_ADAPTER_STATE", ""}}, {.description = five}, "QUENX_ADAPTER_STATE: it is empty; "},
-        {{{"QUENX_ADAPTERS", five}}, {.description = missing}, "there is no adapter description " + missing},
-        {{}, {.description = ""}, "there is no adapter description "},
-        {{{"QUENX_BACKEND", "devlink"}, {"QUENX_ADAPTERS", five}}, {}, "QUENX_ADAPTERS: simulated adapters "},
-        {{}, {.backend = "devlink", .description = five}, "simulated adapters are described in " + five},
+        {{{"QUENX_ADAPTERS", ""}}, {}, "QUENX_ADAPTERS" + isEmpty},
+        {{{"QUENX_ADAPTERS", missing}}, {}, "QUENX_ADAPTERS: " + noFile + missing + nameOne},
+        {{{"QUENX_ADAPTERS", wrong}},
+         {.backend = "auto"},
+         "QUENX_ADAPTERS: " + wrong + ", line 1: adapter description: \"adapter\" must be a list of tables"},
+        {{{"QUENX_BACKEND", ""}, {"QUENX_ADAPTERS", five}}, {}, "QUENX_BACKEND" + isEmpty},
+        {{{"QUENX_ADAPTER_STATE", ""}}, {.description = five}, "QUENX_ADAPTER_STATE" + isEmpty},
+        {{{"QUENX_ADAPTERS", five}}, {.description = missing}, noFile + missing + nameOne},
+        {{}, {.description = ""}, noFile + nameOne},
+        {{{"QUENX_BACKEND", "devlink"}, {"QUENX_ADAPTERS", five}}, {}, "QUENX_ADAPTERS: " + isTwo},
+        {{}, {.backend = "devlink", .description = five}, isTwo},
     };
     for (const auto& [variables, choice, expected] : table) {
         choose(variables);
-        EXPECT_NE(std::string::npos, searchOf(choice).find(expected)) << searchOf(choice) << "\n" << expected;
+        EXPECT_EQ(expected, searchOf(choice));
     }
 }
 

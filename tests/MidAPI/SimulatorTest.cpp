@@ -12,6 +12,7 @@
 #include "MidAPI/Simulator/FlashStore.h"
 #include "MidAPI/ma.h"
 #include "Support/SimulatedAdapters.h"
+#include "Support/SyslogCapture.h"
 #include "Support/TestRoms.h"
 #include "Utils/Os/Linux/linux.h"
 
@@ -48,8 +49,18 @@ TEST(SimulatorTest, WritesOnlyImagesForTheCard) {
     const test::SimulatedAdapters adapters;
     Rom broken = test::madeRom({{PXE, 9}});
     broken.back() ^= 1;
-    for (const Rom& bad : {broken, Rom(), test::madeRom({{PXE, 9}}, 0x10ec, 0x8139)})
-        EXPECT_EQ(ma::WriteError::BadImage, test::writeImage("eth0", bad).code);
+    const std::pair<Rom, std::string> table[] = {
+        {broken,
+         "the image is not intact: image 1 at 0x0: the checksum is wrong: the bytes sum to 1, not 0 "
+         "(offset 0x0)"},
+        {Rom(), "the image is not intact: image 1 at 0x0: the file is empty (offset 0x0)"},
+        {test::madeRom({{PXE, 9}}, 0x10ec, 0x8139),
+         "the image is for PCI device 10ec:8139, not for 1af4:1041"}};
+    for (const auto& [bad, text] : table) {
+        const test::WriteResult result = test::writeImage("eth0", bad);
+        EXPECT_EQ(ma::WriteError::BadImage, result.code);
+        EXPECT_EQ(text, result.text);
+    }
     const test::WriteResult refused = test::writeImage("eth3", test::madeRom({{PXE, 9}}, 0x1022, 0x2000));
     EXPECT_EQ(refused.code, ma::WriteError::NotUpdatable);
     EXPECT_EQ(refused.text, "this adapter cannot be updated");
@@ -64,13 +75,70 @@ TEST(SimulatorTest, WritesOnlyImagesForTheCard) {
     };
     EXPECT_TRUE(test::writeImage("eth0", images(PXE)).done);
     const test::WriteResult result = test::writeImage("eth0", images(UEFI));
-    EXPECT_NE(std::string::npos, result.text.find("more than 64 images")) << result.text;
+    EXPECT_EQ(ma::WriteError::BadImage, result.code);
+    EXPECT_EQ(
+        "with what the adapter keeps it would not be a ROM: image 65 at 0x10000: more than 64 images "
+        "(offset 0x10000)",
+        result.text);
     EXPECT_EQ("IMG_PXE 9, IMG_UEFI 0", test::componentsOf("eth0"));
 
     adapters.folder().write("state/eth1", "a file where the folder should be");
     const test::WriteResult failed = test::writeImage("eth1", test::madeRom({{PXE, 9}}));
     EXPECT_EQ(ma::WriteError::DeviceFailed, failed.code);
     EXPECT_NE(std::string::npos, failed.text.find("Not a directory")) << failed.text;
+}
+
+TEST(SimulatorTest, NamesAnAdapterThatIsNotThere) {
+    const test::SimulatedAdapters adapters;
+    const test::SyslogCapture log;
+    const auto expectRefused = [](bool isDone, std::uint32_t code, const std::string& text) {
+        EXPECT_FALSE(isDone);
+        EXPECT_EQ(ma::WriteError::UnknownAdapter, code);
+        EXPECT_EQ("there is no adapter eth9", text);
+    };
+    const test::WriteResult written = test::writeImage("eth9", test::madeRom({{PXE, 9}}));
+    expectRefused(written.done, written.code, written.text);
+    std::uint32_t code = 0;
+    std::string text;
+    const bool isDone = ma::updateCapabilityWord("eth9", {PXE}, code, text);
+    expectRefused(isDone, code, text);
+    EXPECT_EQ(utils::StringArray(2, text), test::SyslogCapture::messages("error"));
+    std::vector<utils::FirmwareVersionInfo> components;
+    EXPECT_FALSE(ma::getAdapterFirmwareVersion("eth9", components));
+    EXPECT_FALSE(ma::getCanBeUpdated("eth9") || ma::setBootType("eth9", ma::BootType::None));
+    EXPECT_EQ(0, ma::getFlashImageUpdateProgress("eth9"));
+    EXPECT_THROW(ma::getAdapterInfo("eth9"), ma::AdapterError);
+}
+
+TEST(SimulatorTest, TellsWhichAdapterFails) {
+    const test::SimulatedAdapters adapters;
+    const test::SyslogCapture log;
+    const auto fail = [&](ma::Operation at) {
+        adapters->injectFault("eth0", {.at = at, .code = 7, .text = "worn out", .once = true});
+    };
+    fail(ma::Operation::PciAddress);
+    EXPECT_EQ("adapter eth0: worn out", test::adapterErrorOf([] { ma::getPCIAddress("eth0"); }));
+    fail(ma::Operation::Info);
+    EXPECT_EQ("adapter eth0: worn out", test::adapterErrorOf([] { ma::getAdapterInfo("eth0"); }));
+    test::SyslogCapture::clear();
+
+    for (const ma::Operation at : {ma::Operation::FirmwareVersion, ma::Operation::Prepare,
+                                   ma::Operation::CapabilityWord, ma::Operation::BootType})
+        fail(at);
+    std::vector<utils::FirmwareVersionInfo> components;
+    EXPECT_FALSE(ma::getAdapterFirmwareVersion("eth0", components));
+    EXPECT_EQ(7, test::prepareImage("eth0", test::madeRom({{PXE, 9}})).status);
+    std::uint32_t code = 0;
+    std::string text;
+    EXPECT_FALSE(ma::updateCapabilityWord("eth0", {PXE}, code, text));
+    EXPECT_EQ(7U, code);
+    EXPECT_FALSE(ma::setBootType("eth0", ma::BootType::None));
+    EXPECT_EQ(utils::StringArray(4, "simulated adapter eth0: worn out"),
+              test::SyslogCapture::messages("error"));
+    fail(ma::Operation::Enumerate);
+    EXPECT_TRUE(ma::enumerateAdapters().empty()) << "all or none";
+    EXPECT_EQ("worn out", test::SyslogCapture::messages("error").back());
+    EXPECT_EQ(5U, ma::enumerateAdapters().size());
 }
 
 TEST(SimulatorTest, SurvivesDamageWhereABankIsLeftAndNamesItWhereNot) {
@@ -162,6 +230,10 @@ TEST(SimulatorTest, WritesOnlyOverTheFirmwareThatAnImageWasHeldAgainst) {
         other.writeFlashImage("eth0", newer.data(), static_cast<std::uint32_t>(newer.size()), code, text));
     const test::WriteResult refused = test::writeImage("eth0", prepared.image);
     EXPECT_EQ(ma::WriteError::Busy, refused.code);
+    EXPECT_EQ(
+        "adapter eth0 has other firmware than when the image was checked: somebody else has updated it; "
+        "check the image again",
+        refused.text);
     EXPECT_EQ("IMG_PXE 3, IMG_UEFI 0", test::componentsOf("eth0"));
 }
 

@@ -65,4 +65,11 @@ std::string componentsOf(const std::string& adapter) {
     return describeComponents(components);
 }
 
+std::string adapterErrorOf(const std::function<void()>& call) try {
+    call();
+    return "none";
+} catch (const ma::AdapterError& error) {
+    return error.what();
+}
+
 }  // namespace test

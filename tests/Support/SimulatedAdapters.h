@@ -2,6 +2,7 @@
 #pragma once
 
 #include <cstdint>
+#include <functional>
 #include <memory>
 #include <string>
 #include <string_view>
@@ -78,5 +79,8 @@ WriteResult writeImage(const std::string& adapter, const std::vector<std::uint8_
 
 /// "IMG_PXE 1, IMG_UEFI 0": what the adapter says that it carries.
 std::string componentsOf(const std::string& adapter);
+
+/// The text of the ma::AdapterError that the call throws; "none" when it throws none.
+std::string adapterErrorOf(const std::function<void()>& call);
 
 }  // namespace test
