@@ -95,8 +95,29 @@ TEST_F(NetworkUseTest, FindsTheConnectionOfWhoAsks) {
             ElementsAre("your own connection from " + std::string(caller) + " comes through " + interface));
         EXPECT_THAT(use({"other"}, caller).losses, IsEmpty()) << caller;
     }
+    const std::string callerV6 = "20010db8000c" + std::string(19, '0') + '1';
+    m_routesV6 += routeV6("eth5", "20010db8000d" + std::string(19, '0') + '1', "80", "00000100");
+    EXPECT_EQ(1U, use({"eth5"}, "2001:db8:d::1").losses.size()) << "a route to one host";
+    // Lines that are no routes, or say that a network is not to be reached.
+    m_routesV4 += "eth0 C6336401 0 0003 0 0 0\n" + routeV4("eth0", 0xC6336401, 0xFFFFFFFF, 0, 2) +
+                  routeV4("eth0", 0xC6336401, 0xFFFFFFFF, 0, 0x201) +
+                  routeV4("eth0", 0xC6336401, 0xFFFFFFFF, -1);
+    m_routesV6 += routeV6("eth4", callerV6, "81", "00000100") + routeV6("eth4", "20010db8000c", "30", "x") +
+                  routeV6("eth4", "20010db8000c", "30", "0", "00000200") +
+                  routeV6("eth4", "20010db8000x", "30", "0") + routeV6("", "20010db8000c", "30", "0") +
+                  routeV6("eth4", "20010db8000c", "30", "0").insert(32, "0");
     for (const char* caller : {"198.51.100.1", "2001:db8:c::1", "name", ""})
         EXPECT_THAT(use({"eth0", "eth1", "eth2", "eth3", "eth4"}, caller).losses, IsEmpty()) << caller;
+}
+
+TEST_F(NetworkUseTest, SaysThatItKnowsNoRoutes) {
+    ma::CardUse found;
+    ma::devlink::findNetworkUse(m_machine, "192.0.2.7", found);
+    EXPECT_THAT(found.losses, ElementsAre("the routes cannot be read"));
+    m_machine.put("/proc/self/net/ipv6_route", "");
+    found.losses.clear();
+    ma::devlink::findNetworkUse(m_machine, "192.0.2.7", found);
+    EXPECT_THAT(found.losses, IsEmpty());
 }
 
 TEST_F(NetworkUseTest, TellsWhichLinksHaveNotComeBack) {
@@ -121,6 +142,11 @@ TEST_F(NetworkUseTest, TellsWhichLinksHaveNotComeBack) {
     put("4", "eth4", false);
     EXPECT_THAT(ma::devlink::missingLinks(m_machine, before),
                 ElementsAre("eth1 is down", "0000:03:00.0 has no network interface (before: eth3)"));
+    m_machine.put("/sys/class/net/eth1/carrier", "0");
+    m_machine.put("/sys/class/net/renamed/carrier", "0");
+    put("3", "eth3", true);
+    EXPECT_THAT(ma::devlink::missingLinks(m_machine, before),
+                ElementsAre("eth1 has no link", "0000:02:00.0 has no link"));
 }
 
 }  // namespace
