@@ -5,6 +5,7 @@
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
+#include <sstream>
 
 namespace test {
 
@@ -290,7 +291,11 @@ Answers Call::finish(Status status) {
         answers.called.outputs.push_back({output.name, output.value});
     if (isDone) return std::move(answers);
     const std::string text = status.msg == nullptr ? "" : at(status.msg).text;
-    if (answers.error != (broker.isSfcb ? "" : text)) die("a CIM_Error where there are such");
+    const std::string code = std::to_string(static_cast<int>(status.rc));
+    // A failure of the provider is of high severity, and an error of the software.
+    const char* const grade = status.rc == ReturnCode::Failed ? " 4 46 " : " 2 0 ";
+    if (answers.error != (broker.isSfcb ? "" : "Quenx QUENX" + code + grade + code + ' ' + text + " 4"))
+        die("a CIM_Error where there are such");
     throw core::CimError(static_cast<core::CimStatus>(status.rc), text);
 }
 
@@ -372,11 +377,18 @@ TestBroker::TestBroker(Dialect dialect) : isSfcb(dialect == Dialect::Sfcb) {
     };
     dateTimes.isInterval = [](auto* time, auto) -> cmpi::Boolean { return at(time).text[21] == ':'; };
     if (isSfcb) return;
-    factories.newCMPIError = [](auto, auto, auto, auto* text, auto...) {
-        return make<cmpi::Error>(&now().broker.errors, text);
+    factories.newCMPIError = [](auto, auto* owner, auto* id, auto* text, int severity, int cause, auto code,
+                                auto) {
+        std::ostringstream whole;
+        whole << owner << ' ' << id << ' ' << severity << ' ' << cause << ' ' << static_cast<int>(code) << ' '
+              << text;
+        return make<cmpi::Error>(&now().broker.errors, whole.str());
     };
     results.returnError = [](auto, auto* error) { return now().answers.error = at(error).text, kDone(); };
-    errors.setErrorType = kDone;
+    errors.setErrorType = [](auto* error, int type) {
+        at(error).text += ' ' + std::to_string(type);
+        return kDone();
+    };
 }
 
 }  // namespace test

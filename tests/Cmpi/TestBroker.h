@@ -106,7 +106,7 @@ struct Answers {
     std::vector<core::CimPath> paths = {};
     core::MethodResult called = {};
     int done = 0;
-    std::string error = {};  ///< the message of the CIM_Error
+    std::string error = {};  ///< the CIM_Error: owner, id, severity, cause, code, message, type
 };
 
 /// A request of a client, by the name of its operation.
