@@ -3,6 +3,8 @@
 #include <gtest/gtest.h>
 
 #include <atomic>
+#include <numeric>
+#include <set>
 #include <span>
 
 #include "Cmpi/LoadedFront.h"
@@ -30,7 +32,10 @@ class CmpiHostileTest : public ::testing::TestWithParam<test::Dialect> {
         const Request& request, const std::function<void(Call&)>& change = [](Call&) {}) const {
         Call call(m_front.broker, request);
         change(call);
-        const ReturnCode code = m_front.send(call).rc;
+        const auto [code, text] = m_front.send(call);
+        if (text != nullptr)
+            m_refusals.insert(std::to_string(static_cast<int>(code)) + " " +
+                              reinterpret_cast<const test::Node*>(text)->text + "\n");
         // What does not fail is right.
         if (code == ReturnCode::Ok && request.op == "invoke") {
             const bool isGiven = (call.in.entries[1].state & ~cmpi::kKeyValue) == 0;
@@ -56,6 +61,11 @@ class CmpiHostileTest : public ::testing::TestWithParam<test::Dialect> {
         return count;
     }
 
+    std::string refusals() const {
+        return std::accumulate(m_refusals.begin(), m_refusals.end(), std::string());
+    }
+
+    mutable std::set<std::string> m_refusals;  // of send()
     test::GadgetAgent m_gadgets;
     LoadedFront m_front{QUENX_CMPI_LIBRARY, GetParam()};
     const CimPath m_a{"Test_Gadget.ID=\"a\",Number=1"};
@@ -83,6 +93,21 @@ TEST_P(CmpiHostileTest, GetsAlongWithoutAnySlotAndTable) {
                         broker.errors, broker.dateTimes));
     EXPECT_GT(failed, 20);
     EXPECT_EQ(failures(), 0);
+    EXPECT_EQ(refusals(), R"(1 parameter Numbers: the object manager does not tell a value that it gave
+1 the object manager could not make an instance of Test_Gadget
+1 the object manager could not make an instance of Test_Link
+1 the object manager could not make an object path
+1 the object manager did not take a key (code 7)
+1 the object manager did not take a result (code 7)
+1 the object manager did not take the end of the results
+1 the object manager did not take the output Echo
+16 Work is called on an instance
+4 '' is not an object path; write one as namespace:Class.Key="value"
+4 SMASHv2:EUnspecifiedError:Text is missing
+4 Test_Gadget has 2 keys, not 0
+4 parameter Numbers: element 0 of an array is null, or of another type
+6 no class "" is served
+)");
     // A slot beyond the level that its table states is not called.
     broker.factories.ftVersion = 100;
     Call call(broker, {"get", CimPath("Test_Gadget", {})});
@@ -114,12 +139,39 @@ TEST_P(CmpiHostileTest, TestsBitsOfStatesAndRefusesTypesThatItDoesNotTake) {
         EXPECT_EQ(send(m_get, [=](Call& call) { lie(call.path.entries[1]); }), ReturnCode::InvalidParameter);
         EXPECT_EQ(send(m_work, [=](Call& call) { lie(call.in.entries[0]); }), ReturnCode::InvalidParameter);
     }
+    EXPECT_EQ(refusals(), R"(4 SMASHv2:EUnspecifiedError:Text is missing
+4 Test_Gadget has 2 keys, not 1
+4 an embedded instance is taken nowhere here
+4 key Number does not hold a value of type uint32
+4 no CIM type has the code 1
+4 no CIM type has the code 12288
+4 no CIM type has the code 4608
+4 no CIM type has the code 5376
+4 no CIM type has the code 6400
+4 no CIM type has the code 65535
+4 no CIM type has the code 6656
+4 no CIM type has the code 8193
+4 parameter Text: an embedded instance is taken nowhere here
+4 parameter Text: no CIM type has the code 1
+4 parameter Text: no CIM type has the code 4608
+4 parameter Text: no CIM type has the code 5376
+4 parameter Text: no CIM type has the code 57343
+4 parameter Text: no CIM type has the code 6400
+4 parameter Text: no CIM type has the code 6656
+6 Test_Gadget.ID="a",Number=255 names no instance
+6 Test_Gadget.ID="a",Number=65535 names no instance
+)");
 }
 
 TEST_P(CmpiHostileTest, RefusesWhatIsNestedOrLongAndGoesOn) {
     CimPath deep = m_a;
-    for (int i = 0; i < 100; ++i)
+    for (int i = 0; i < 100; ++i) {
         deep = CimPath("Test_Link", {{"From", deep}, {"To", m_a}});
+        if (i == 7 || i == 8) send({"get", deep});
+    }
+    EXPECT_EQ(refusals(),
+              "4 references are nested too deep in a path\n"
+              "6 a path of 6680 bytes names no instance\n");
     const std::string longText(1 << 20, 'x');
     for (const CimPath& path : {deep, CimPath(longText, {}), CimPath("Test_Gadget", {{longText, longText}}),
                                 CimPath("Test_Gadget", {{"ID", longText}, {"Number", longText}})}) {

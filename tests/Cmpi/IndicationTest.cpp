@@ -163,7 +163,10 @@ TEST_P(CmpiIndicationTest, TellsTheWayOfAnUpdateInOrder) {
         EXPECT_NE(path.getHost(), "");
         EXPECT_EQ(path.getHost(), each.indication.text("SourceInstanceHost"));
         EXPECT_FALSE(each.indication.get<utils::Time>("IndicationTime")->isPeriod());
-        identifiers.insert(each.indication.text("IndicationIdentifier"));
+        const std::string identifier = each.indication.text("IndicationIdentifier");
+        EXPECT_TRUE(identifier.starts_with("Quenx:1")) << identifier;
+        EXPECT_TRUE(identifier.ends_with("-" + std::to_string(identifiers.size() + 1))) << identifier;
+        identifiers.insert(identifier);
     }
     EXPECT_EQ(identifiers.size(), all.size());
     EXPECT_EQ(source(all.back()).number("PercentComplete"), 100U);
@@ -235,13 +238,15 @@ TEST_P(CmpiIndicationTest, DropsTheOldestWhereTheManagerDoesNotComeBack) {
     isIn.get_future().wait();
     for (unsigned int i = 1; i < 3000; ++i)
         tell(i);
-    EXPECT_EQ(test::SyslogCapture::count("the oldest are dropped"), 1U);
+    const std::string dropping =
+        R"("The object manager does not take indications; the oldest are dropped from here on")";
+    EXPECT_EQ(test::SyslogCapture::count(dropping), 1U);
     goOn.set_value();
     std::vector<std::uint64_t> expected{0};
     for (std::uint64_t i = 3000 - 1024; i < 3000; ++i)
         expected.push_back(i);
     EXPECT_EQ(numbersOf(m_deliveries.waitFor(1025)), expected);
-    EXPECT_TRUE(test::SyslogCapture::contains("1975 events were dropped"));
+    EXPECT_TRUE(test::SyslogCapture::contains(R"("1975 events were dropped")"));
 }
 
 TEST_P(CmpiIndicationTest, EndsWhileAnIndicationIsOnItsWay) {
@@ -277,11 +282,13 @@ TEST_P(CmpiIndicationTest, GoesOnWhereTheManagerTakesOneOfThemOnly) {
         tell(number);
     EXPECT_EQ(numbersOf(m_deliveries.waitFor(1)), std::vector<std::uint64_t>{4});
     EXPECT_EQ(test::SyslogCapture::count("Indications do not reach those who listen: the object manager did "
-                                         "not take an indication (code 6)"),
+                                         "not take an indication (code 6)\""),
               1U);
 }
 
 TEST_P(CmpiIndicationTest, GetsAlongWithoutAnySlot) {
+    const test::LogLevelGuard logged(1);
+    const test::SyslogCapture log;
     test::TestBroker& broker = m_front.broker;
     int refused = 0;
     int silent = 0;
@@ -311,6 +318,14 @@ TEST_P(CmpiIndicationTest, GetsAlongWithoutAnySlot) {
                std::tie(broker.table, broker.factories, broker.memory, broker.instances));
     EXPECT_EQ(refused, 4);
     EXPECT_EQ(silent, 5);  // instances, paths, datetimes, arrays, properties
+    const std::vector<std::string> errors = test::SyslogCapture::messages("error");
+    std::set<std::string> expected;
+    for (const char* reason : {"could not make a datetime", "could not make an array",
+                               "could not make an instance of CIM_InstModification",
+                               "could not make an object path", "did not take SourceInstance (code 7)"})
+        expected.insert("Indications do not reach those who listen: the object manager " +
+                        std::string(reason));
+    EXPECT_EQ((std::set<std::string>(errors.begin(), errors.end())), expected);
     m_listener.begin();
     const std::size_t before = m_deliveries.all().size();
     tell(m_job, m_job);
