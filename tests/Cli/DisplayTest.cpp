@@ -3,6 +3,7 @@
 #include <gtest/gtest.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <sstream>
 
 #include "Cli/Display/Output.h"
@@ -40,19 +41,26 @@ TEST(OutputTest, WritesValuesAsTextAndAsJson) {
 TEST(OutputTest, CutsAlignsAndDisarmsText) {
     EXPECT_EQ(cli::elideMiddle("abcdefghij", 10), "abcdefghij");
     EXPECT_EQ(cli::elideMiddle("abcdefghij", 8), "abc...ij");
+    EXPECT_EQ(cli::elideMiddle("abcdefghij", 4), "a...");
+    EXPECT_EQ(cli::elideMiddle("abcdefghij", 3), "...");
     EXPECT_EQ(cli::elideMiddle("abcdefghij", 2), "..");
     EXPECT_EQ(cli::elideMiddle("äöüäöüäöüä", 8), "äöü...üä");
     EXPECT_EQ(cli::printable("\x7F\xC2\x9B\x80 \xC2\xA0\xE2\x82\xAC"),
               "\\x7f\\xc2\\x9b\\x80 \xC2\xA0\xE2\x82\xAC");
     EXPECT_EQ(cli::printable("\xE2\x80\xB0\xE2\x80\xAE\xE2\x81\xA6\xE2\x81"),
               "\xE2\x80\xB0\\xe2\\x80\\xae\\xe2\\x81\\xa6\\xe2\\x81");
-    for (const std::string hidden : {"\xC2\xAD", "\xD8\x9C", "\xE2\x80\x8F", "\xE2\x80\xA8", "\xEF\xBB\xBF"})
+    for (const std::string hidden :
+         {"\x1F", "\xC2\x80", "\xC2\x9F", "\xC2\xAD", "\xD8\x9C", "\xE2\x80\x8B", "\xE2\x80\x8F",
+          "\xE2\x80\xA8", "\xE2\x80\xAE", "\xE2\x81\xA0", "\xE2\x81\xAF", "\xEF\xBB\xBF"})
         EXPECT_TRUE(cli::printable(hidden).starts_with("\\x")) << hidden;
+    for (const std::string shown : {" ", "\xC2\xA0", "\xE2\x80\x8A", "\xE2\x80\x90", "\xE2\x80\xA7",
+                                    "\xE2\x80\xAF", "\xE2\x81\x9F", "\xE2\x81\xB0", "\xE1\x80\x8B"})
+        EXPECT_EQ(cli::printable(shown), shown);
     std::ostringstream out;
     cli::printTable(out, {{"A", "B"}, {"long\n\x1b", "x"}, {"größe", "y"}, {"", ""}});
     std::ostringstream wide;
     cli::printTable(wide, {{std::string(100000, 'x'), "a"}, {"y", "b"}});
-    EXPECT_LT(wide.str().size(), 100300U);
+    EXPECT_EQ(wide.str(), std::string(100000, 'x') + "  a\ny" + std::string(201, ' ') + "b\n");
     EXPECT_EQ(out.str(), "A             B\nlong\\x0a\\x1b  x\ngröße         y\n              \n");
 }
 
@@ -62,6 +70,9 @@ TEST(OutputTest, WrapsTextBetweenWords) {
     EXPECT_EQ(cli::wrapped("  --name    says who it is", 20, 12),
               (Lines{"  --name    says who", "            it is"}));
     EXPECT_EQ(cli::wrapped("/a/path/without/end", 8), (Lines{"/a/path/", "without/", "end"}));
+    EXPECT_EQ(cli::wrapped("12345 789", 5), (Lines{"12345", "789"}));
+    EXPECT_EQ(cli::wrapped("123456 89", 5), (Lines{"12345", "6 89"}));
+    EXPECT_EQ(cli::wrapped(" 23456", 5), (Lines{" 2345", "6"})) << "no empty line";
 }
 
 TEST(OutputTest, FitsATableToTheTerminal) {
@@ -121,17 +132,45 @@ TEST(ProgressTest, FitsTheWidthAndSaysNoMoreThanItKnows) {
     EXPECT_EQ(cli::barText(half, 80),
               "eth0  [=========>         ]  50 %  125.0 KiB of 250.0 KiB  50.0 KiB/s  0:03 left");
     EXPECT_EQ(cli::barText(half, 40), "eth0  [=============>            ]  50 %");
-    EXPECT_EQ(cli::barText(half, 12), "eth0   50 %");
-    for (std::size_t width = 20; width < 120; ++width)
-        EXPECT_LE(cli::barText(half, width).size(), width);
+    // Each width that makes room for more, and the widest bar.
+    std::string steps;
+    std::ptrdiff_t blanks = 0;
+    for (std::size_t width = 1; width <= 120; ++width) {
+        const std::string text = cli::barText(half, width);
+        EXPECT_LE(text.size(), std::max<std::size_t>(width, 11));
+        const std::string details = text.substr(text.rfind(']') + 1);
+        const auto now = std::ranges::count(details, ' ');
+        if (now != blanks || width == 120) steps += std::to_string(width) + " " + text + "\n";
+        blanks = now;
+    }
+    EXPECT_EQ(steps,
+              "1 eth0   50 %\n"
+              "22 eth0  [====>   ]  50 %\n"
+              "46 eth0  [====>   ]  50 %  125.0 KiB of 250.0 KiB\n"
+              "58 eth0  [====>   ]  50 %  125.0 KiB of 250.0 KiB  50.0 KiB/s\n"
+              "69 eth0  [====>   ]  50 %  125.0 KiB of 250.0 KiB  50.0 KiB/s  0:03 left\n"
+              "120 eth0  [====================>                   ]  50 %  125.0 KiB of 250.0 KiB  50.0 "
+              "KiB/s  0:03 left\n");
     EXPECT_EQ(cli::lineText(half), "eth0: 50 %, 125.0 KiB of 250.0 KiB, 50.0 KiB/s, 0:03 left");
     EXPECT_EQ(cli::lineText({"eth0", 10, 0, milliseconds(5000), 10}), "eth0: 10 %");
     EXPECT_EQ(cli::lineText({"eth0", 20, 0, milliseconds(5000), 10}), "eth0: 20 %, 0:40 left");
     EXPECT_EQ(cli::lineText({"eth0", 20, 0, milliseconds(299), 10}), "eth0: 20 %");
     EXPECT_EQ(cli::lineText({"eth0", 20, 0, milliseconds(300), 10}), "eth0: 20 %, 0:03 left");
     EXPECT_EQ(cli::lineText({"eth0", 100, 1023, milliseconds(5000), 10}), "eth0: 100 %, 1023 B of 1023 B");
-    EXPECT_EQ(cli::byteText(std::uint64_t{5} << 40), "5.0 TiB");
-    EXPECT_EQ(cli::durationText(seconds(3723)), "1:02:03");
+    EXPECT_EQ(cli::lineText({"a\x1B", 99, 1024, milliseconds(99000), 0}),
+              "a\\x1b: 99 %, 1013 B of 1.0 KiB, 10 B/s, 0:01 left");
+    const std::pair<std::uint64_t, const char*> sizes[] = {{1023, "1023 B"},
+                                                           {1024, "1.0 KiB"},
+                                                           {1024 * 1024 - 52, "1023.9 KiB"},
+                                                           {1024 * 1024, "1.0 MiB"},
+                                                           {std::uint64_t{5} << 40, "5.0 TiB"},
+                                                           {std::uint64_t{5} << 50, "5120.0 TiB"}};
+    for (const auto& [bytes, text] : sizes)
+        EXPECT_EQ(cli::byteText(bytes), text);
+    const std::pair<int, const char*> durations[] = {
+        {59, "0:59"}, {60, "1:00"}, {3599, "59:59"}, {3600, "1:00:00"}, {3723, "1:02:03"}};
+    for (const auto& [duration, text] : durations)
+        EXPECT_EQ(cli::durationText(seconds(duration)), text);
 }
 
 TEST(JobViewTest, NamesItsState) {
@@ -175,7 +214,11 @@ TEST(ProgressTest, WaitsForNobodyWhoDoesNotRead) {
 
 TEST(ProgressTest, WritesPlainLinesAndIsNotSilentWhenNothingMoves) {
     EXPECT_EQ(show({20, 20, 55, 100}), "eth0: 0 %\neth0: 20 %\neth0: 55 %, 0:03 left\neth0: 100 %\n");
-    EXPECT_EQ(show(std::vector<unsigned>(25, 3)), "eth0: 0 %\neth0: 3 %\neth0: 3 %\n");
+    EXPECT_EQ(show(std::vector<unsigned>(21, 3)), "eth0: 0 %\neth0: 3 %\neth0: 3 %\n");
+    EXPECT_EQ(show(std::vector<unsigned>(20, 3)), "eth0: 0 %\neth0: 3 %\n");
+    EXPECT_EQ(
+        show({9, 10, 19, 20, 99, 100, 100}),
+        "eth0: 0 %\neth0: 10 %, 1:30 left\neth0: 20 %, 0:22 left\neth0: 99 %, 0:01 left\neth0: 100 %\n");
 }
 
 }  // namespace
