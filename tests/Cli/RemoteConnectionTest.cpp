@@ -93,6 +93,63 @@ std::string message(const std::string& id, const std::string& content) {
     return "<MESSAGE ID='" + id + "' PROTOCOLVERSION='1.0'><SIMPLERSP>" + content + "</SIMPLERSP></MESSAGE>";
 }
 
+/// An attribute of a request, by the end of its element's name and its own.
+std::string valueOf(const std::string& name, const std::string& request) {
+    const std::size_t start = request.find(name + "=\"") + name.size() + 2;
+    return request.substr(start, request.find('"', start) - start);
+}
+
+/// What is sent for this, where the server gives a piece of a list, and then knows no operation at all.
+std::string sentFor(const std::function<void(core::CimOperations&)>& work) {
+    std::string sent;
+    const ToldServer server([&](int client, const std::string& request) {
+        sent += request + "\n";
+        std::erase(sent, '\r');
+        const bool isMethod = request.find("<METHODCALL") != std::string::npos;
+        const std::string name = valueOf("METHODCALL NAME", request);
+        const std::string content =
+            name.starts_with("Open")
+                ? "<IRETURNVALUE></IRETURNVALUE><PARAMVALUE NAME='EnumerationContext' PARAMTYPE='string'>"
+                  "<VALUE>x</VALUE></PARAMVALUE>"
+                : "<ERROR CODE='7'/>";
+        const std::string element = isMethod ? "METHODRESPONSE" : "IMETHODRESPONSE";
+        ToldServer::sendResponse(
+            client, message(valueOf("MESSAGE ID", request),
+                            "<" + element + " NAME='" + name + "'>" + content + "</" + element + ">"));
+    });
+    EXPECT_THROW(work(*server.connect().operations), core::CimError);
+    return sent;
+}
+
+TEST(RemoteConnectionTest, SendsEachOperationWithItsParameters) {
+    const core::CimPath path("Y.Name=\"1 ä\"");
+    const core::AssociationFilter by{"A", "B", "c", "d"};
+    const core::PropertyFilter some{{"P", "Q"}};
+    const std::function<void(core::CimOperations&)> table[] = {
+        [&](auto& operations) { operations.enumerateInstances("Y", some); },
+        [&](auto& operations) { operations.enumerateInstanceNames("Y"); },
+        [&](auto& operations) { operations.getInstance(path, some); },
+        [&](auto& operations) { operations.associators(path, by, some); },
+        [&](auto& operations) { operations.associators(core::CimPath("Y", {}), {}); },
+        [&](auto& operations) { operations.associatorNames(path, by); },
+        [&](auto& operations) { operations.references(path, by, some); },
+        [&](auto& operations) {
+            operations.referenceNames(path, {"", "B", "c", "d"});
+        },
+        [&](auto& operations) { operations.invokeMethod(path, "X y", {}); },
+        [&](auto& operations) { operations.deleteInstance(path); },
+        [&](auto& operations) {
+            operations.createInstance({path, {}});
+        },
+        [&](auto& operations) { operations.getClass("Y"); },
+    };
+    std::string sent;
+    for (const auto& work : table)
+        sent += sentFor(work);
+    const auto expected = test::readTestFile(QUENX_CLI_TEST_DIR "/samples/requests");
+    EXPECT_EQ(sent, std::string(expected.begin(), expected.end()));
+}
+
 TEST(RemoteConnectionTest, TakesNoAnswerForAnotherRequestsOrForNothing) {
     const std::string returned = "<RETURNVALUE><VALUE>0</VALUE></RETURNVALUE></METHODRESPONSE>";
     const char* const other = "The server's answer belongs to another request.";
@@ -193,13 +250,9 @@ TEST(RemoteConnectionTest, GivesUpAnswersWithoutEnd) {
     EXPECT_LT(sent, 128);
     // Nor does a list come to an end because its pieces are small.
     const ToldServer server([](int client, const std::string& request) {
-        const auto valueOf = [&](const std::string& name) {
-            const std::size_t start = request.find(name + "=\"") + name.size() + 2;
-            return request.substr(start, request.find('"', start) - start);
-        };
         ToldServer::sendResponse(
-            client, message(valueOf("MESSAGE ID"),
-                            "<IMETHODRESPONSE NAME='" + valueOf("IMETHODCALL NAME") +
+            client, message(valueOf("MESSAGE ID", request),
+                            "<IMETHODRESPONSE NAME='" + valueOf("IMETHODCALL NAME", request) +
                                 "'><IRETURNVALUE></IRETURNVALUE><PARAMVALUE NAME='EndOfSequence' "
                                 "PARAMTYPE='boolean'><VALUE>FALSE</VALUE></PARAMVALUE><PARAMVALUE "
                                 "NAME='EnumerationContext' PARAMTYPE='string'><VALUE>x</VALUE></PARAMVALUE>"
