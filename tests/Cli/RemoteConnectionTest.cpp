@@ -6,6 +6,7 @@
 #include <atomic>
 #include <cstdlib>
 #include <functional>
+#include <nlohmann/json.hpp>
 #include <thread>
 
 #include "Cli/Connection/Connection.h"
@@ -50,12 +51,20 @@ class ToldServer {
     }
 
   private:
+    static bool isWhole(const std::string& request) {
+        constexpr std::string_view kLength = "Content-Length: ";
+        const std::size_t end = request.find("\r\n\r\n");
+        const std::size_t length = request.find(kLength);
+        return end != std::string::npos &&
+               request.size() - end - 4 >=
+                   (length == std::string::npos ? 0 : std::stoul(request.substr(length + kLength.size())));
+    }
     void serve() const {
         for (int number = 0; (number = ::accept(m_socket.number(), nullptr, nullptr)) >= 0;) {
             const os::Descriptor client(number);  // closed with its answer
             std::string request;
             std::array<char, 4096> bytes{};
-            while (request.find("</CIM>") == std::string::npos) {
+            while (!isWhole(request)) {
                 const ssize_t length = ::recv(number, bytes.data(), bytes.size(), 0);
                 if (length <= 0) break;
                 request.append(bytes.data(), static_cast<std::size_t>(length));
@@ -165,7 +174,7 @@ TEST(RemoteConnectionTest, TakesNoAnswerForAnotherRequestsOrForNothing) {
          "The server's answer cannot be read: element METHODRESPONSE has no RETURNVALUE."}};
     for (const auto& row : table)
         EXPECT_THAT([&] { call(row.first); }, ThrowsMessage<cli::NoAnswer>(StrEq(row.second)));
-    EXPECT_FALSE(ToldServer(table[0].first).connect().control->checkImage("</CIM>", "", {}, {}))
+    EXPECT_FALSE(ToldServer(table[0].first).connect().control->checkImage("", "", {}, {}))
         << "a server that has only the model";
     const ToldServer server(message("1", "<METHODRESPONSE NAME='EnumerateInstanceNames'>" + returned));
     EXPECT_THROW(server.connect().operations->enumerateInstanceNames("Y"), cli::NoAnswer);
@@ -308,6 +317,83 @@ TEST(RemoteConnectionTest, ReadsAListWholeFromAServerWithoutPieces) {
     EXPECT_EQ(connection.operations->enumerateInstanceNames("Y").size(), 1U);
     EXPECT_TRUE(connection.operations->enumerateInstances("Y").empty());
     EXPECT_EQ(requests, 4);  // it does not ask again
+}
+
+/// A server with paths of its own that gives this answer, and keeps what it was asked.
+struct ControlServer {
+    ControlServer(const std::string& head, const std::string& body)
+        : server([=, this](int client, const std::string& request) {
+              asked = request;
+              std::erase(asked, '\r');
+              ToldServer::sendBytes(client, "HTTP/1.1 " + head + "\r\nConnection: close\r\nContent-Length: " +
+                                                std::to_string(body.size()) + "\r\n\r\n" + body);
+          }),
+          control(server.connect().control) {}
+
+    std::string asked;
+    const ToldServer server;
+    const std::shared_ptr<cli::ServerControl> control;
+};
+constexpr const char* kControl = "200 OK\r\nQuenx-Interface: 1";
+
+TEST(ServerControlTest, ReadsWhatTheServerTells) {
+    EXPECT_EQ(ControlServer(kControl, R"({"claim": null})").control->held()->adapter, "");
+    EXPECT_FALSE(ControlServer("200 OK", R"({"claim": null})").control->held()) << "another program's";
+    const auto held = [](const std::string& holder, const char* user) {
+        return *ControlServer(kControl, R"({"claim": {"adapter": "eth0", "holder": ")" + holder +
+                                            R"(", "job": "J#1", "isNeeded": true, "user": )" + user +
+                                            R"(, "since": "20260102030405.000000+000"}})")
+                    .control->held();
+    };
+    EXPECT_EQ(held("job", "null").text(), "J#1");
+    EXPECT_EQ(held("verification", "\"ann\"").text(), "a verification of ann");
+    nlohmann::ordered_json json = held("check", "\"ann\"");
+    EXPECT_EQ(
+        json.dump(),
+        R"({"holder":"check","user":"ann","job":"J#1","since":"20260102030405.000000+000","needed":true})");
+    json = cli::HeldAdapter{.adapter = "eth0"};
+    EXPECT_EQ(json.dump(), R"({"holder":"","user":null,"job":null,"since":null,"needed":false})");
+
+    ControlServer released(kControl, R"({"released": true})");
+    EXPECT_EQ(released.control->release("eth0"), true);
+    EXPECT_EQ(
+        released.asked,
+        "POST /quenx/v1/release HTTP/1.1\nHost: localhost\nAccept: */*\nContent-Type: application/json\n"
+        "Content-Length: 18\n\n{\"adapter\":\"eth0\"}");
+    ControlServer checked(kControl, R"({"returnValue": 4097, "signedBy": "k"})");
+    EXPECT_EQ(checked.control->checkImage("file:///x", "T", {5, 3}, {"IMG_PXE"}), 4097U);
+    EXPECT_TRUE(checked.asked.starts_with("POST /quenx/v1/check HTTP"));
+    EXPECT_TRUE(
+        checked.asked.ends_with(R"({"options":[5,3],"target":"T","uri":"file:///x","values":["IMG_PXE"]})"));
+    const ControlServer trusted(
+        kControl, R"({"images": [{"asked": true, "key": "k", "reasonId": "QX-0707", "why": "w"}]})");
+    const auto images = trusted.control->trustOf({"file:///x"});
+    EXPECT_TRUE(images->at(0).isAsked);
+    EXPECT_EQ(images->at(0).key + images->at(0).why, "kw");
+}
+
+TEST(ServerControlTest, RefusesAnswersThatItCannotRead) {
+    const std::string unreadable = "The server's answer cannot be read.";
+    const std::tuple<std::string, std::string, std::string> table[] = {
+        {kControl, "{}", unreadable},
+        {kControl, "[]", unreadable},
+        {kControl, "{", unreadable},
+        {kControl, R"({"images": []})", unreadable},
+        {"409 X\r\nQuenx-Interface: 1", R"({"error": "it is needed"})", "The server refuses: it is needed."},
+        {"403 X\r\nQuenx-Interface: 1", R"({"error": "you may not"})", "you may not"},
+        {"404 X\r\nQuenx-Interface: 1", "{}", "The server answered with HTTP status 404."},
+        {"404 X\r\nQuenx-Interface: 1", "[1]", "The server answered with HTTP status 404."},
+        {"401 X", "", "The server does not accept the user name and password."},
+        {"403 X", "", "This user may not use the server."},
+        {"503 X", "", kBusy.substr(0, kBusy.size() - 1)},
+    };
+    for (const auto& [head, body, said] : table) {
+        const ControlServer server(head, body);
+        EXPECT_THAT([&] { server.control->trustOf({"file:///x"}); },
+                    ThrowsMessage<std::exception>(StrEq(said)))
+            << head << body;
+    }
+    EXPECT_FALSE(ControlServer("404 X", "").control->trustOf({""}));
 }
 
 }  // namespace
