@@ -4,11 +4,14 @@
 
 #include <filesystem>
 #include <fstream>
+#include <numeric>
+#include <set>
 
 #include "Cmpi/LoadedFront.h"
 #include "Framework/Requests/CimRequests.h"
 #include "Support/SimulatedAdapters.h"
 #include "Support/SyslogCapture.h"
+#include "Support/TempFolder.h"
 #include "Support/TestModel.h"
 #include "Utils/Os/Linux/PolicyFile.h"
 
@@ -126,6 +129,7 @@ class CmpiOperationsTest : public ::testing::Test {
         for (const std::string& op : operations) {
             request.op = op;
             const std::string expected = answerOf([&] { return inProcess(m_requests, request); });
+            m_answers.insert(expected + "\n");
             for (test::LoadedFront& front : m_fronts) {
                 front.create();
                 if (op == "delete") m_gadgets.add("a", 1);
@@ -141,6 +145,7 @@ class CmpiOperationsTest : public ::testing::Test {
     // The library is the same, so each has to be created again before it is asked.
     test::LoadedFront m_fronts[2] = {{QUENX_CMPI_LIBRARY, test::Dialect::Sfcb},
                                      {QUENX_CMPI_LIBRARY, test::Dialect::Pegasus}};
+    std::set<std::string> m_answers;  // each that was expected
     const CimPath m_a{"Test_Gadget.ID=\"a\",Number=1"};
     const std::vector<std::string> m_walks{"associators", "associatorNames", "references", "referenceNames"};
 };
@@ -250,6 +255,10 @@ TEST_F(CmpiOperationsTest, CallsMethodsDeletesAndRefuses) {
         for (const char* method : {"WORK", "NotImplemented", "Unknown", ""})
             expectSame({"invoke"}, {"", m_a, {}, {}, method, arguments});
     }
+    expectSame({"delete"}, {"", m_requests.enumerateInstanceNames("Test_Link").front()});
+    const auto expected = test::readTestFile(QUENX_CMPI_TEST_DIR "/samples/answers");
+    EXPECT_EQ(std::accumulate(m_answers.begin(), m_answers.end(), std::string()),
+              std::string(expected.begin(), expected.end()));
 }
 
 TEST_F(CmpiOperationsTest, KnowsNothingOfOtherClassesAndServesEveryNamespace) {
