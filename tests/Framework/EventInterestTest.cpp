@@ -1,12 +1,13 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Framework/Events/EventInterest.h"
 
-#include <gtest/gtest.h>
+#include <gmock/gmock.h>
 
 #include <optional>
 
 #include "Framework/Events/EventSink.h"
 #include "Framework/Model/CimError.h"
+#include "Support/SyslogCapture.h"
 #include "Support/TestModel.h"
 
 namespace {
@@ -20,10 +21,14 @@ class TalkativeClass : public test::ListedClass<Gadget> {
         if (refuses) throw std::runtime_error("no indications today");
         told += '+';
     }
-    void disableIndications() override { told += '-'; }
+    void disableIndications() override {
+        told += '-';
+        if (refusesTheEnd) throw std::runtime_error("not yet");
+    }
 
     std::string told;
     bool refuses = false;
+    bool refusesTheEnd = false;
 };
 
 class TalkativeAgent : public core::CimAgent {
@@ -62,13 +67,21 @@ TEST(EventInterestTest, TellsAgentsOfTheFirstListenerAndOfTheLast) {
 TEST(EventInterestTest, LeavesNothingWhereItCannotBe) {
     const TalkativeAgent agent;
     const core::InstalledEventSink installed(std::make_shared<SilentSink>());
-    EXPECT_THROW(core::EventInterest("Test_Nothing"), core::CimError);
+    EXPECT_THAT([] { const core::EventInterest interest("Test_Nothing"); },
+                ::testing::ThrowsMessage<core::CimError>(::testing::StrEq(
+                    "no class \"Test_Nothing\" is served, whose instances anybody could be told of")));
     agent.gadgets->refuses = true;
     EXPECT_THROW(core::EventInterest("Test_Thing"), std::runtime_error);
     EXPECT_EQ(core::EventSink::wanting("Test_Gadget"), nullptr);
     agent.gadgets->refuses = false;
-    const core::EventInterest interest("Test_Thing");
+    std::optional<core::EventInterest> interest("Test_Thing");
     EXPECT_EQ(agent.gadgets->told, "-+");
+    const test::LogLevelGuard logged(1);
+    const test::SyslogCapture log;
+    agent.gadgets->refusesTheEnd = true;
+    interest.reset();
+    EXPECT_EQ(test::SyslogCapture::messages("error"),
+              std::vector<std::string>{"Indications of Test_Gadget could not be disabled: not yet"});
 }
 
 }  // namespace
