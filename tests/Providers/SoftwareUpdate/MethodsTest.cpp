@@ -3,6 +3,8 @@
 #include <gtest/gtest.h>
 
 #include <map>
+#include <numeric>
+#include <set>
 
 #include "Framework/Classes/CimBroker.h"
 #include "Framework/Classes/RequestScope.h"
@@ -16,6 +18,7 @@
 #include "Providers/SoftwareUpdate/UpdateTest.h"
 #include "Support/TestRoms.h"
 #include "Utils/Os/Linux/PolicyFile.h"
+#include "Utils/Os/Linux/linux.h"
 #include "Utils/Utils.h"
 
 namespace {
@@ -31,6 +34,22 @@ const std::string kInstall = "InstallFromURI; URI=<good>; Target=<eth0>; Install
 const std::string kInstallIdentity =
     "InstallFromSoftwareIdentity; Source=<image>; Target=<eth0>; InstallOptionsValues=; InstallOptions=";
 const std::string kCheck = "CheckSoftwareIdentity; Source=<image>; Target=";
+
+/// A history that fails when it is asked, or later.
+class FailingSink : public core::UpdateSink {
+  public:
+    std::future<core::ImageFacts> examine(std::span<const std::uint8_t>) noexcept override { return {}; }
+    void refused(const core::UpdateAttempt& attempt, unsigned int returnValue, core::ReasonId reason,
+                 const std::string& text) noexcept override {
+        said += attempt.caller.principal + " " + std::to_string(returnValue) + " " +
+                core::reasonCode(reason) + ": " + text + "\n";
+    }
+    std::string problem() override { return m_problem; }
+    std::shared_ptr<core::UpdateRecord> begin(const core::UpdateAttempt&) noexcept override { return {}; }
+
+    std::string m_problem = "the disk is full";
+    std::string said;
+};
 
 class MethodsTest : public test::UpdateTest {
   protected:
@@ -90,7 +109,7 @@ class MethodsTest : public test::UpdateTest {
         return result.returnValue;
     }
     /// A call, its outcome and its lines as in the sample.
-    void expect(const Texts& row) const {
+    void expect(const Texts& row) {
         SCOPED_TRACE(row[0]);
         const std::size_t blank = std::min(row.at(1).find(' '), row[1].size());
         const std::string value = row[1].substr(0, blank);
@@ -100,6 +119,8 @@ class MethodsTest : public test::UpdateTest {
         test::SyslogCapture::clear();
         setClaim(claimed);
         const CallResult result = make(row[0]);
+        for (const std::string& line : test::SyslogCapture::messages("error"))
+            m_errors.insert(line + "\n");
         EXPECT_EQ(core::reasonCode(result.reason), utils::trim(row[1].substr(blank)));
         EXPECT_EQ(result.error, throws ? "SMASHv2:" + row.at(2) : "");
         EXPECT_TRUE(throws || std::to_string(result.returnValue) == value) << result.returnValue;
@@ -129,13 +150,28 @@ class MethodsTest : public test::UpdateTest {
         return found;
     }
 
+    /// What was said of refusals, to the history and in the log, is that of the sample.
+    void expectSaid(const std::string& said, const std::string& sample) const {
+        std::string text = std::accumulate(m_errors.begin(), m_errors.end(), said);
+        for (const auto& [own, shown] :
+             {std::pair(m_folder.path(), "<folder>"), {"SystemName=\"" + os::getHostname() + '"', "<host>"}})
+            for (std::size_t at = 0; (at = text.find(own)) != std::string::npos;)
+                text.replace(at, own.size(), shown);
+        const auto expected = test::readTestFile(QUENX_UPDATE_SAMPLES "/" + sample);
+        EXPECT_EQ(text, std::string(expected.begin(), expected.end()));
+    }
+
     const CimPath m_port = port("eth0");
     std::map<std::string, std::string> m_names;
+    std::set<std::string> m_errors;  // lines of the log
 };
 
 TEST_F(MethodsTest, AnswerEachCallWithItsValueLineJobAndClaim) {
+    const auto sink = std::make_shared<FailingSink>();
+    const core::InstalledSink installed(sink);
     for (const Texts& row : test::readTestTable(QUENX_UPDATE_SAMPLES "/calls"))
         expect(row);
+    expectSaid(sink->said, "calls-refused");
     // The controller stood for the first of its ports.
     EXPECT_EQ(test::componentsOf("eth0"), "IMG_PXE 2, IMG_UEFI 1");
     EXPECT_EQ(test::componentsOf("eth1"), "IMG_PXE 1, IMG_UEFI 0");
@@ -144,6 +180,8 @@ TEST_F(MethodsTest, AnswerEachCallWithItsValueLineJobAndClaim) {
 }
 
 TEST_F(MethodsTest, DecideByTheStatusOfThePreparation) {
+    const auto sink = std::make_shared<FailingSink>();
+    const core::InstalledSink installed(sink);
     for (Texts row : test::readTestTable(QUENX_UPDATE_SAMPLES "/statuses")) {
         const Texts words = utils::split(row[0], ' ');
         const Codes options = words.at(1) == "forced" ? Codes{5, 3} : Codes{5};
@@ -154,6 +192,7 @@ TEST_F(MethodsTest, DecideByTheStatusOfThePreparation) {
         expect(row);
         EXPECT_EQ(checkImage(m_port, options), row[1] == "4096" ? 0 : std::stoul(row[1]));
     }
+    expectSaid(sink->said, "statuses-refused");
 }
 
 TEST_F(MethodsTest, ACheckGivesTheClaimBackWhereTheConfigurationSaysSo) {
@@ -298,22 +337,6 @@ TEST_F(MethodsTest, AsksThePolicyBeforeAnythingIsClaimed) {
                   "[\"root\", \"alice\"]");
     EXPECT_FALSE(m_requests.enumerateInstances("Quenx_EthernetPort").empty());
 }
-
-/// A history that fails when it is asked, or later.
-class FailingSink : public core::UpdateSink {
-  public:
-    std::future<core::ImageFacts> examine(std::span<const std::uint8_t>) noexcept override { return {}; }
-    void refused(const core::UpdateAttempt& attempt, unsigned int returnValue, core::ReasonId reason,
-                 const std::string& text) noexcept override {
-        said += attempt.caller.principal + " " + std::to_string(returnValue) + " " +
-                core::reasonCode(reason) + ": " + text + "\n";
-    }
-    std::string problem() override { return m_problem; }
-    std::shared_ptr<core::UpdateRecord> begin(const core::UpdateAttempt&) noexcept override { return {}; }
-
-    std::string m_problem = "the disk is full";
-    std::string said;
-};
 
 TEST_F(MethodsTest, InstallsNothingWithoutTheHistoryThatThePolicyRequires) {
     const utils::PolicyFile policy(m_folder.write("policy.toml", "history = \"required\"\n"));
