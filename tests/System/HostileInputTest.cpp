@@ -16,6 +16,7 @@
 #include "CimXml/WireCheck.h"
 #include "System/RawConnection.h"
 #include "System/RunningDaemon.h"
+#include "Utils/Utils.h"
 
 namespace {
 
@@ -221,6 +222,50 @@ TEST_F(HostileInputTest, BoundsTheMemoryOfAnswersThatNobodyReads) {
     EXPECT_GT(answers[200], 0);
     EXPECT_GT(answers[503], 0);
     EXPECT_EQ(answers[200] + answers[503], 60);
+}
+
+/// A megabyte and more of answer, whatever the headers of its request leave of the room that they share.
+TEST(LargeAnswerTest, ArrivesBesideTheLongestHeaders) {
+    const test::TempFolder folder;
+    std::string adapters;
+    for (int i = 0; i < 400; ++i) {
+        adapters += "[[adapter]]\nname = 'eth" + std::to_string(i) + "'\npci_address = '" +
+                    utils::formatStr("0000:%02x:%02x.0", 1 + i / 32, i % 32) +
+                    "'\npci_id = '1af4:1041'\nmac = '" +
+                    utils::formatStr("52:54:00:10:%02x:%02x", i / 256, i % 256) +
+                    "'\nflash_file = '/usr/lib/ipxe/qemu/efi-virtio.rom'\n";
+    }
+    const test::RunningDaemon daemon({"--adapters-description", folder.write("many.toml", adapters)});
+    std::string body = test::readSample("w-EnumerateInstances.xml");
+    const std::size_t name = body.find("Quenx_ConcreteJob");
+    body.replace(name, std::string("Quenx_ConcreteJob").size(), "CIM_ManagedElement");
+    // With origins an answer is built in one piece.
+    const std::string origin = "ClassOrigin\"><VALUE>TRUE";
+    body.replace(body.find(origin), origin.size(), "ClassOrigin\"><VALUE>FALSE");
+    std::string outcomes;
+    for (std::size_t length = 31000; length < 32700; length += 100) {
+        const RawConnection connection(daemon.httpPort(), "127.0.0.1");
+        std::string request =
+            httpRequest(body, "Authorization: Basic Z3Vlc3Q6Z3Vlc3Q=\r\nX: " + std::string(length, 'y'));
+        // On a connection that is to be kept, and the head by itself, as most clients send it.
+        const std::string close = "Connection: close\r\n";
+        request.erase(request.find(close), close.size());
+        const std::size_t head = request.size() - body.size();
+        connection.send(request.substr(0, head));
+        std::this_thread::sleep_for(50ms);
+        connection.send(request.substr(head));
+        std::string answer;
+        while (!answer.ends_with("</CIM>\n")) {
+            const std::string piece = connection.receivePiece();
+            if (piece.empty()) break;
+            answer += piece;
+        }
+        const std::string outcome =
+            std::to_string(statusOf(answer)) +
+            (answer.size() > 2'000'000 && answer.ends_with("</CIM>\n") ? " whole, " : ", ");
+        if (!outcomes.ends_with(outcome)) outcomes += outcome;
+    }
+    EXPECT_EQ(outcomes, "200 whole, 0, 431, ") << "beside the longest the library closes without an answer";
 }
 
 }  // namespace

@@ -14,6 +14,7 @@
 #include "Host/Authentication/ClientAddress.h"
 #include "Host/Control/Control.h"
 #include "Host/Operations/Dispatcher.h"
+#include "Host/Server/AnswerBody.h"
 #include "Host/Server/ConnectionWatch.h"
 #include "Host/Server/HttpServer.h"
 #include "Host/Server/LocalSocket.h"
@@ -102,29 +103,6 @@ HttpAnswer answerOf(AuthenticationOutcome outcome) {
         default:
             return HttpAnswer::withHeader(401, "WWW-Authenticate", kRealm);
     }
-}
-
-/// What the HTTP library owns, since it may send the body after our last function has returned.
-struct Body {
-    std::optional<AnswerCharge> charge;  // first: given back when the pieces have gone
-    cimxml::Pieces pieces;
-};
-
-void freeBody(void* body) {
-    delete static_cast<Body*>(body);
-}
-
-/// The response takes the body over without copying it.
-MHD_Response* makeResponse(HttpAnswer& answer) {
-    std::unique_ptr<Body> body(new Body{std::move(answer.charge), std::move(answer.body)});
-    std::vector<MHD_IoVec> places;
-    places.reserve(body->pieces.size());
-    for (const std::string& piece : body->pieces)
-        places.push_back({piece.data(), piece.size()});
-    MHD_Response* response = ::MHD_create_response_from_iovec(
-        places.data(), static_cast<unsigned int>(places.size()), freeBody, body.get());
-    if (response != nullptr) static_cast<void>(body.release());
-    return response;
 }
 
 }  // namespace
