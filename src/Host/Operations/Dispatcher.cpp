@@ -141,7 +141,11 @@ cimxml::Pieces Dispatcher::answer(const cimxml::Request& request, const Caller& 
     // What the stream holds of an enumeration that failed is not part of the answer.
     const auto* result = std::get_if<IntrinsicResult>(&response.content);
     if (result != nullptr && result->isStreamed) return stream.finish();
-    return {cimxml::writeResponse(std::move(response), [&](std::size_t bytes) { charge.cover(bytes); })};
+    // Not by an initializer list, which would copy the text.
+    cimxml::Pieces whole;
+    whole.push_back(
+        cimxml::writeResponse(std::move(response), [&](std::size_t bytes) { charge.cover(bytes); }));
+    return whole;
 }
 
 cimxml::Response Dispatcher::carryOut(const cimxml::Request& request, const Caller& caller,
