@@ -113,6 +113,8 @@ void Writer::work(const std::shared_ptr<State>& state) {
         } else if (gatherAt <= now) {
             state->gatheredAt.reset();
             performTask(state->gathered);
+            // What came meanwhile waits for the next time, so that tasks have their turn in between.
+            if (state->gatheredAt) state->gatheredAt = Clock::now() + kGathering;
         } else if (!state->tasks.empty()) {
             const Task task = std::move(state->tasks.front());
             state->tasks.pop_front();

@@ -162,9 +162,10 @@ TEST_F(HistoryTest, ShowsRefusalsAtOnceAndSyncsManyTogether) {
     EXPECT_LT(during - before, 20);
 
     history.refused(attempt(), 5, core::ReasonId::ImageDamaged, "the last");
-    while (records().size() == found.size())
-        std::this_thread::sleep_for(std::chrono::milliseconds(1));
     const auto end = std::chrono::steady_clock::now() + std::chrono::seconds(10);
+    while (records().size() == found.size() && std::chrono::steady_clock::now() < end)
+        std::this_thread::sleep_for(std::chrono::milliseconds(1));
+    EXPECT_NE(records().size(), found.size());
     while (syncs == during && std::chrono::steady_clock::now() < end)
         std::this_thread::sleep_for(std::chrono::milliseconds(20));
     EXPECT_GT(syncs, during) << "it never reached the disk";
