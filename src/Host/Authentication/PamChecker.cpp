@@ -45,7 +45,10 @@ class PamSession {
         void (*delay)(int, unsigned int, void*) = noDelay;
         ::pam_set_item(m_handle, PAM_FAIL_DELAY, reinterpret_cast<const void*>(delay));
     }
-    ~PamSession() { ::pam_end(m_handle, m_status); }  // takes none, too
+    ~PamSession() {
+        // Of none the library would complain to the system log.
+        if (m_handle != nullptr) ::pam_end(m_handle, m_status);
+    }
     PamSession(const PamSession&) = delete;
     PamSession& operator=(const PamSession&) = delete;
 
