@@ -65,7 +65,7 @@ NUMBER = re.compile(r"(?<![\w.'\"])\d+(?![\w.'\"])")
 TEXT = re.compile(r'"(?:[^"\\]|\\.)*"')
 # Besides what is no code: debug lines, whose wording is free, the size of room set aside, which nobody sees, and what
 # another compiler alone reads.
-DEBUG_LINE = re.compile(r"^\s*QUENX_DEBUG|\bTimeStamp \w+\(")
+DEBUG_LINE = re.compile(r"(?:^|\s)QUENX_DEBUG|\bTimeStamp \w+\(")
 LEFT_ALONE = re.compile(r"^\s*(#|//|///|using |namespace |static_assert|template)|__FILE__|__attribute__|"
                         r"\.reserve\(|\bchar \w+\[|QUENX_CAPABILITY\(")
 WORDING = re.compile(r"\s|^\\n$")  # in a text of a front: something for people to read
