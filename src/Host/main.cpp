@@ -90,7 +90,8 @@ void stop(host::Daemon& daemon, const Signals& signals) {
 
 /// Each connection has a thread, and by default the C library keeps what was free for each of dozens of them:
 /// many times the budget of answers. With two arenas four clients waited for one another in every request;
-/// with eight, 32 clients who read large answers left 12 MiB behind, and 6 with four.
+/// with eight, what 32 clients and then four more had read in large answers left 15 MiB behind, and 6 with
+/// four.
 void boundKeptMemory() {
     constexpr int kArenas = 4;
     constexpr int kMappedAlone = 256 << 10;  // bytes, which go back to the system as soon as they are free

@@ -35,8 +35,8 @@ class EndedJobs {
     std::map<std::string, Clock::time_point> m_firstSeen;  ///< by path
 };
 
-/// How often to look for those: ten times as often as one can come to be beyond the bounds, but every one to
-/// ten seconds. Nothing without a bound.
+/// The time between two looks for those: ten seconds, or a tenth of the age that jobs may reach where that is
+/// less, but at least one second. Nothing without a bound.
 std::optional<std::chrono::seconds> pauseBetweenLooks(const JobSettings& settings);
 
 /// Deletes the jobs that have ended, completed or failed, and are beyond the bounds, as a client does by
