@@ -12,10 +12,6 @@ namespace cli {
 
 namespace {
 
-bool takesValue(const CLI::Option& option) {
-    return option.get_type_size() > 0;
-}
-
 const CLI::Option* findOption(const CLI::App& app, const std::string& word) {
     return word.starts_with('-') ? app.get_option_no_throw(word) : nullptr;
 }

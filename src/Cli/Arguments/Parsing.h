@@ -17,6 +17,11 @@ CLI::Option* addValue(CLI::App& app, const char* name, Value& value, const char*
     return app.add_option(name, value, description)->type_name(type);
 }
 
+/// Whether it is no flag. The size of its type does not tell, which the library gives to flags, too.
+inline bool takesValue(const CLI::Option& option) {
+    return option.get_items_expected_max() > 0;
+}
+
 /// Adds the verbs with what each takes, in the order in which the help lists them. Reading the command line
 /// then fills the arguments, which have to live until that is done.
 void addVerbs(CLI::App& app, Arguments& arguments);
