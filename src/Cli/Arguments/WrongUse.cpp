@@ -48,6 +48,8 @@ std::string messageOf(const CLI::App& app, const CLI::App& verb, const CLI::Pars
     const std::size_t dashes = text.find("--");
     const std::size_t start = dashes == std::string::npos ? 0 : dashes;
     const std::string option = text.substr(start, text.find_first_of(": ", start) - start);
+    const CLI::Option* known = verb.get_option_no_throw(option);
+    constexpr std::string_view kValue = " = ";
     switch (static_cast<CLI::ExitCodes>(error.get_exit_code())) {
         case CLI::ExitCodes::ExtrasError:
             return "Unexpected argument \"" + app.remaining(true).front() + "\".";
@@ -57,12 +59,14 @@ std::string messageOf(const CLI::App& app, const CLI::App& verb, const CLI::Pars
             return option + (text.find("At Most") == std::string::npos ? " needs a value."
                                                                        : " can be given only once.");
         case CLI::ExitCodes::ConversionError:
-            return option + " takes no value.";  // texts always convert, so it was a flag
+            // Texts always convert, so it was a number or a flag.
+            if (known == nullptr || !takesValue(*known)) return option + " takes no value.";
+            return option + " is \"" + text.substr(text.find(kValue) + kValue.size()) +
+                   "\", which is no number that it can take.";
         case CLI::ExitCodes::RequiredError: {
             // Arguments have a name only to the library; the help shows what they are.
-            const CLI::Option* argument = verb.get_option_no_throw(option);
-            const bool isArgument = argument != nullptr && argument->get_positional();
-            return (isArgument ? argument->get_type_name() : option) + " is required.";
+            const bool isArgument = known != nullptr && known->get_positional();
+            return (isArgument ? known->get_type_name() : option) + " is required.";
         }
         default:
             return text + ".";
@@ -95,8 +99,7 @@ CommandError wrongUse(const CLI::App& app, const CLI::ParseError& error) {
     if (verb != nullptr) return {ExitStatus::WrongUse, messageOf(app, *verb, error), askHelpOf(*verb)};
     // A word that belongs to nothing stands where a verb would.
     const std::vector<std::string> rest = app.remaining();
-    if (error.get_exit_code() == static_cast<int>(CLI::ExitCodes::ExtrasError) && !rest.empty())
-        return unknownVerb(app, rest.front());
+    if (!rest.empty() && !rest.front().starts_with('-')) return unknownVerb(app, rest.front());
     return {ExitStatus::WrongUse, messageOf(app, app, error), kAskHelp};
 }
 
