@@ -1,5 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 // What the adapters of this machine were asked to install.
+#include <algorithm>
 #include <cstdio>
 #include <ctime>
 
@@ -52,7 +53,7 @@ history::Filter filterOf(const HistoryOptions& options) {
     history::Filter filter;
     filter.adapter = options.adapter;
     // The domain 0 is left out elsewhere, too.
-    const bool isShort = options.adapter.size() == 7 && options.adapter[2] == ':';
+    const bool isShort = std::ranges::count(options.adapter, ':') == 1;
     if (isShort) filter.adapter = "0000:" + options.adapter;
     filter.failedOnly = options.failedOnly;
     if (!options.since.empty()) filter.since = timeOf(options.since);
