@@ -146,18 +146,23 @@ class InstallVerbTest : public ::testing::Test {
     ExitStatus run(cli::Verb verb, bool isInProcess = true) {
         for (std::ostringstream* stream : {&m_out, &m_error, &m_lines})
             stream->str("");
+        m_ends = 0;
         const cli::Connection connection{
             .operations = m_service, .history = m_history, .isInProcess = isInProcess, .sharesFiles = true};
         cli::LinePrinter printer(m_lines, {});
         cli::ProgressDisplay progress(printer, [] { return std::chrono::steady_clock::time_point(); });
-        cli::Context context{
-            .connection = connection,
-            .out = m_out,
-            .error = m_error,
-            .json = m_isJson,
-            .progress = progress,
-            .following = {.pause = [] {}, .interrupted = [this] { return m_isInterrupted; }},
-            .ask = [this](const std::string&, const std::function<bool()>&) { return m_answer; }};
+        cli::Context context{.connection = connection,
+                             .out = m_out,
+                             .error = m_error,
+                             .json = m_isJson,
+                             .progress = progress,
+                             .following = {.pause = [] {},
+                                           .interrupted = [this] { return m_isInterrupted; },
+                                           .over = [this] { ++m_ends; }},
+                             .ask = [this](const std::string& question, const std::function<bool()>&) {
+                                 m_question = question;
+                                 return m_answer;
+                             }};
         cli::VerbOptions options;
         options.mayDisrupt = m_mayDisrupt;
         options.update.target = "eth0";
@@ -182,6 +187,8 @@ class InstallVerbTest : public ::testing::Test {
     bool m_isForced = false;
     bool m_isJson = false;
     std::optional<std::string> m_answer;  ///< of the user
+    std::string m_question;
+    int m_ends = 0;  ///< how often the program was told that it may be interrupted
 };
 
 ExitStatus showPending(cli::Context& context, const cli::VerbOptions&) {
@@ -206,6 +213,9 @@ TEST_F(InstallVerbTest, FollowsTheJobOverABrokenConnection) {
               "eth0: 0 %, 0 B of 2.0 KiB\neth0: 40 %, 819 B of 2.0 KiB\neth0: 100 %, 2.0 KiB of 2.0 KiB\n");
     EXPECT_EQ(m_out.str(), kUpdated);
     EXPECT_EQ(m_error.str(), "");
+    EXPECT_EQ(m_ends, 1);
+    EXPECT_EQ(install(), ExitStatus::AlreadyCurrent);
+    EXPECT_EQ(m_ends, 1);
 }
 
 TEST_F(InstallVerbTest, SaysBeforeACheckThatAServerMayHoldTheAdapter) {
@@ -226,6 +236,7 @@ TEST_F(InstallVerbTest, SaysBeforeACheckThatAServerMayHoldTheAdapter) {
 TEST_F(InstallVerbTest, CallsNothingAFailureWhoseOutcomeItDoesNotKnow) {
     m_service->unanswered = 1000;
     EXPECT_EQ(install(), ExitStatus::Unknown);
+    EXPECT_EQ(m_ends, 0) << "it may still run in this program";
     EXPECT_TRUE(m_error.str().starts_with(
         "quenxctl: No answer.\nThe update may still be running: \"quenxctl jobs\" shows"))
         << m_error.str();
@@ -238,6 +249,7 @@ TEST_F(InstallVerbTest, CallsNothingAFailureWhoseOutcomeItDoesNotKnow) {
     m_service->answersTheCall = true;
     m_service->hasMemory = false;
     EXPECT_EQ(install(), ExitStatus::Unknown);
+    EXPECT_EQ(m_ends, 0);
 }
 
 TEST_F(InstallVerbTest, TakesNoOtherJobForItsOwn) {
@@ -471,7 +483,16 @@ TEST_F(CardVerbTest, WritesToManyHardwareAdaptersOnlyWhenTheyAreMeant) {
     m_many = {.isAll = true, .images = {m_file}};
     for (const auto& answer : {std::optional<std::string>(), {"n"}, {""}}) {
         m_answer = answer;
-        EXPECT_THROW(install(), cli::CommandError);
+        try {
+            install();
+            ADD_FAILURE() << "nobody has said yes";
+        } catch (const cli::CommandError& error) {
+            EXPECT_EQ(error.status(), ExitStatus::WrongUse);
+            EXPECT_STREQ(error.what(),
+                         "Nothing was written: these adapters are hardware, and nobody has confirmed that "
+                         "they are meant: eth0.");
+        }
+        EXPECT_EQ(m_question, "Write to eth0? [y/N] ");
         EXPECT_FALSE(m_service->isCalled);
     }
     m_many.isDryRun = true;
@@ -483,6 +504,11 @@ TEST_F(CardVerbTest, WritesToManyHardwareAdaptersOnlyWhenTheyAreMeant) {
     EXPECT_EQ(install(), ExitStatus::Interrupted);
     EXPECT_FALSE(m_service->isCalled);
     m_isInterrupted = false;
+    EXPECT_EQ(install(), ExitStatus::Done);
+    EXPECT_EQ(m_ends, 1);
+    m_many.isConfirmed = false;
+    m_answer = "yes";
+    m_service->jobs = {job(7, 100)};
     EXPECT_EQ(install(), ExitStatus::Done);
 }
 
@@ -506,30 +532,86 @@ TEST(CardOfTest, IsTheSameForTheFunctionsOfACard) {
 TEST_F(CardVerbTest, ActivatesWhatWaitsAndTellsHowThatEnded) {
     using enum ma::Activation::Status;
     m_mayDisrupt = true;
-    const std::tuple<ma::Activation, ExitStatus, std::string> table[] = {
-        {{Done, ""}, ExitStatus::Done, "eth0 runs the firmware in its flash.\n"},
-        {{NotOffered, ""}, ExitStatus::Failed, "eth0 cannot be activated while the machine runs.\nRestart"},
+    const std::string restart =
+        "Restart the machine; some adapters need it to be without power for a moment.\n";
+    const std::tuple<ma::Activation, ExitStatus, std::string, std::string> table[] = {
+        {{Done, ""}, ExitStatus::Done, "activated", "eth0 runs the firmware in its flash.\n"},
+        {{NotOffered, ""},
+         ExitStatus::Failed,
+         "not offered",
+         "eth0 cannot be activated while the machine runs.\n" + restart},
         {{WouldDisrupt, "the default route goes through br0"},
          ExitStatus::Failed,
-         "would cut the network: the default route goes through br0.\n"},
+         "refused",
+         "Activating eth0 would cut the network: the default route goes through br0.\nDo it from another way "
+         "in, or with --disrupt if you can do without for a moment.\n"},
         {{Failed, "Input/output error"},
          ExitStatus::Failed,
-         "failed; the old firmware still runs: Input/output error.\n"},
-        {{StillPending, "fw 1 runs"}, ExitStatus::ResetPending, "does not run yet: fw 1 runs.\nRestart"},
-        {{Unknown, "no answer"}, ExitStatus::Unknown, "is not known: no answer.\n"},
-        {{Done, "the driver does not tell"}, ExitStatus::Done, "eth0 was reset: the driver does not tell.\n"},
-        {{NotBack, "enp1s0 has no link"}, ExitStatus::Unknown, "all there again: enp1s0 has no link.\n"},
+         "failed",
+         "The activation of eth0 failed; the old firmware still runs: Input/output error.\nThe kernel's log "
+         "may have more.\n"},
+        {{StillPending, "fw 1 runs"},
+         ExitStatus::ResetPending,
+         "still pending",
+         "eth0 was reset, but its new firmware does not run yet: fw 1 runs.\n" + restart},
+        {{Unknown, "no answer"},
+         ExitStatus::Unknown,
+         "unknown",
+         "Whether eth0 was reset, and which firmware it runs, is not known: no answer.\n\"quenxctl "
+         "adapters\" and the kernel's log may tell; a restart of the machine brings it back.\n"},
+        {{Done, "the driver does not tell"},
+         ExitStatus::Done,
+         "activated",
+         "eth0 was reset: the driver does not tell.\n"},
+        {{NotBack, "enp1s0 has no link"},
+         ExitStatus::Unknown,
+         "not back",
+         "eth0 was reset, but is not all there again: enp1s0 has no link.\nLook at \"ip link\" and the "
+         "kernel's log; a restart of the machine brings it back.\n"},
     };
-    for (const auto& [activation, status, said] : table) {
+    for (const auto& [activation, status, result, said] : table) {
         m_card->activation = activation;
+        m_isJson = false;
         EXPECT_EQ(run(cli::activate), status);
-        EXPECT_TRUE(m_out.str().starts_with(kCard));
-        EXPECT_NE((m_out.str() + m_error.str()).find(said), std::string::npos) << m_error.str();
+        EXPECT_EQ(m_ends, 1);
+        EXPECT_EQ(m_out.str() + m_error.str(),
+                  kCard + (status == ExitStatus::Done ? "" : std::string("quenxctl: ")) + said);
+        EXPECT_EQ(m_error.str().empty(), status == ExitStatus::Done);
+        m_isJson = true;
+        EXPECT_EQ(run(cli::activate), status);
+        EXPECT_TRUE(m_out.str().starts_with("{\n  \"result\": \"" + result + "\"")) << m_out.str();
     }
     EXPECT_TRUE(m_card->mayDisrupt);
     m_card->needed = ma::ResetNeeded::None;
     m_card->activation = {Failed, "not to be asked for"};
     EXPECT_EQ(run(cli::activate), ExitStatus::AlreadyCurrent);
+    EXPECT_EQ(m_out.str(), R"({
+  "result": "already current",
+  "exitStatus": 3,
+  "message": "eth0 runs the firmware in its flash: nothing waits for a reset.",
+  "advice": "",
+  "adapter": "eth0",
+  "backend": "",
+  "card": {
+    "functions": [
+      "eth0",
+      "eth1"
+    ],
+    "interfaces": [
+      "enp1s0"
+    ],
+    "bonds": [],
+    "bridges": [
+      "br0"
+    ],
+    "losses": []
+  }
+}
+)");
+    m_isJson = false;
+    EXPECT_EQ(run(cli::activate), ExitStatus::AlreadyCurrent);
+    EXPECT_EQ(m_out.str(),
+              kCard + std::string("eth0 runs the firmware in its flash: nothing waits for a reset.\n"));
 }
 
 }  // namespace
