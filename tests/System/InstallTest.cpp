@@ -71,6 +71,17 @@ TEST_F(InstallTest, HasColoursOnATerminalOnly) {
     }
 }
 
+TEST_F(InstallTest, FoldsTheHelpWhereThereIsRoomBesideTheNames) {
+    const std::string head = "Usage: quenxctl jobs [OPTIONS]\r\n\r\nOptions:\r\n";
+    const std::string option = "  -h,--help                   Print this help message";
+    for (const auto& [width, rest] :
+         {std::pair{"60", " and\r\n                              exit\r\n"}, {"59", " and\r\nexit\r\n"}}) {
+        Program program({"/bin/sh", "-c", "stty cols $0; exec \"$@\"", width, QUENXCTL, "help", "jobs"},
+                        Program::Output::Terminal);
+        EXPECT_THAT(program.finish().out, HasSubstr(head + option + rest)) << width;
+    }
+}
+
 TEST_F(InstallTest, WaitsForTheEndAfterCtrlC) {
     HeldFlash flash(m_flash);
     Program program(command(kInstall), Program::Output::Terminal, {"TERM=xterm", "NO_COLOR"});

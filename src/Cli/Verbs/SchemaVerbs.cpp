@@ -34,13 +34,16 @@ void show(std::ostream& out, const std::vector<RegistrationFile>& files) {
 /// @param changed  those of the files that were written
 void tell(std::ostream& out, const Registration& registration, const std::optional<std::string>& directory,
           const std::vector<std::string>& changed) {
-    for (const RegistrationFile& file : registration.files) {
-        if (!directory) break;
-        const bool isChanged = std::ranges::find(changed, file.name) != changed.end();
-        out << printable(pathOf(*directory, file)) << (isChanged ? " was written.\n" : " is up to date.\n");
+    if (!directory) {
+        // On its own, the text on standard output would look like the whole work.
+        out << "Nothing was written. --output DIR puts this into a folder.\n";
+    } else {
+        for (const RegistrationFile& file : registration.files) {
+            const bool isChanged = std::ranges::find(changed, file.name) != changed.end();
+            out << printable(pathOf(*directory, file))
+                << (isChanged ? " was written.\n" : " is up to date.\n");
+        }
     }
-    // On its own, the text on standard output would look like the whole work.
-    if (!directory) out << "Nothing was written. --output DIR puts this into a folder.\n";
     out << "What to do next, as root" << (directory ? ", in that folder" : ", with that in a folder")
         << ":\n";
     for (const std::string& step : registration.nextSteps)
