@@ -14,7 +14,9 @@
 namespace {
 
 using test::RawConnection;
+using ::testing::AllOf;
 using ::testing::ContainsRegex;
+using ::testing::EndsWith;
 using ::testing::HasSubstr;
 
 constexpr const char* kAdmin = "Authorization: Basic YWRtaW46YWRtaW4=";
@@ -125,13 +127,16 @@ TEST_P(ClaimTest, OfACheckStaysUntilItIsFreedUnlessThePolicyGivesItBack) {
                                              "Free it with \"quenxctl release eth0\""));
         // No history is served here: the answer itself has the id.
         EXPECT_THAT(remote(install + " --force --json").out, HasSubstr("\"reasonId\": \"QX-0402\""));
-        EXPECT_THAT(remote("status").out, HasSubstr("\neth0 (simulated)  a check of admin  20"));
+        EXPECT_THAT(remote("status").out,
+                    AllOf(HasSubstr("\neth0 (simulated)  a check of admin  20"),
+                          EndsWith("What holds eth0 has ended. Free it with \"quenxctl release eth0\".\n")));
         EXPECT_EQ(remote("release eth1").out, "eth1 was not held.\n");
         EXPECT_EQ(remote("release 0000:03:00.0").out, "eth0 is free again.\n");
     }
     EXPECT_EQ(remote(install).status, 0);
     EXPECT_THAT(remote("status").out,
-                HasSubstr("\neth0 (simulated)  -        -      -    Completed (Quenx:"));
+                AllOf(HasSubstr("\neth0 (simulated)  -        -      -    Completed (Quenx:"),
+                      ::testing::Not(HasSubstr("What holds"))));
     EXPECT_EQ(remote("check --force --target eth0 " + m_daemon.image()).status, 0);
     EXPECT_THAT(remote("check --json --target eth0 file:///none").out,
                 HasSubstr("\"reasonId\": \"QX-0202\""));
