@@ -375,6 +375,14 @@ TEST_F(CardVerbTest, TellsOfTheCardBeforeAndOfTheResetAfterAnUpdate) {
     m_service->updateState = "Busy";
     run(cli::showAdapters);
     EXPECT_NE(m_out.str().find("1af4:1041  busy       IMG_PXE 1"), std::string::npos) << m_out.str();
+    run(cli::showOverview);
+    EXPECT_TRUE(
+        m_out.str().ends_with("\n\nWhat you can do next:\n"
+                              "quenxctl adapters --pending  new firmware that does not run yet\n"
+                              "quenxctl status              who writes to which adapter\n"
+                              "quenxctl history             what was done, by whom, and how it ended\n"
+                              "quenxctl help                everything else\n"))
+        << m_out.str();
 }
 
 TEST_F(CardVerbTest, NamesAdaptersThatDoNotAnswerAmongThePending) {
@@ -382,6 +390,11 @@ TEST_F(CardVerbTest, NamesAdaptersThatDoNotAnswerAmongThePending) {
     m_service->installed.clear();
     EXPECT_EQ(run(showPending), ExitStatus::Unknown);
     EXPECT_TRUE(m_error.str().starts_with("The firmware of eth0 cannot be read. ")) << m_error.str();
+    EXPECT_EQ(m_out.str(), "No adapter that answers waits for a reset.\n");
+    m_isJson = true;
+    EXPECT_EQ(run(showPending), ExitStatus::Unknown);
+    EXPECT_EQ(m_out.str(), "{\n  \"adapters\": [],\n  \"silent\": [\n    \"eth0\"\n  ]\n}\n");
+    m_isJson = false;
     m_service->isSilent = false;
     m_service->updateState = "Busy";
     EXPECT_EQ(run(showPending), ExitStatus::Unknown);
@@ -475,6 +488,20 @@ TEST_F(CardVerbTest, TakesTheWordOfTheHistoryForAnImageThatTellsNoVersion) {
     attempt.values = {"IMG_PXE"};
     m_history->begin(attempt)->end(true, 0, "");
     EXPECT_EQ(install(), ExitStatus::Unknown);
+    EXPECT_FALSE(m_service->isCalled);
+    // Nor is there a way back over what has failed on the way.
+    const auto broken = m_history->begin(attempt);
+    m_card->installed = 3;
+    broken->end(false, 6, "worn out");
+    try {
+        run(cli::rollback);
+        ADD_FAILURE() << m_out.str();
+    } catch (const cli::CommandError& error) {
+        EXPECT_EQ(error.status(), ExitStatus::Failed);
+        EXPECT_STREQ(error.what(),
+                     "A later update of eth0 (record 3 of the history: failed) may have left anything in its "
+                     "flash.");
+    }
     EXPECT_FALSE(m_service->isCalled);
 }
 
