@@ -86,7 +86,7 @@ TEST_F(ListenerTest, TakesMessagesAndAnswersWhatIsNone) {
     sender.send(longest);
     EXPECT_EQ(take(), "");
     sender.send("\r\nContent-Length: 4194304\r\n\r\n");
-    auto sent = std::async([&] { return sender.send(std::string(4194304, 'y')); });
+    auto sent = std::async(std::launch::async, [&] { return sender.send(std::string(4194304, 'y')); });
     EXPECT_EQ(take(10000), std::string(4194304, 'y'));
     EXPECT_TRUE(sent.get());
     EXPECT_EQ(sender.receive(), taken);
@@ -148,7 +148,7 @@ class TellingServer : public core::CimRequests {
         if (!url.empty()) m_url = url;
         note(call);
         if (calls.size() > makes) throw core::CimError(core::CimStatus::Failed, "no room");
-        if (calls.size() == 3) told = std::async([this] { tell(m_url); });
+        if (calls.size() == 3) told = std::async(std::launch::async, [this] { tell(m_url); });
         return CimPath(instance.path.getClassName() + ".Name=\"" + instance.text("Name") + "\"");
     }
     void deleteInstance(const CimPath& path) override {
