@@ -369,7 +369,7 @@ TEST(ServerControlTest, ReadsWhatTheServerTells) {
         kControl, R"({"images": [{"asked": true, "key": "k", "reasonId": "QX-0707", "why": "w"}]})");
     const auto images = trusted.control->trustOf({"file:///x"});
     EXPECT_TRUE(images->at(0).isAsked);
-    EXPECT_EQ(images->at(0).key + images->at(0).why, "kw");
+    EXPECT_EQ(images->at(0).key + images->at(0).why + core::reasonCode(images->at(0).reason), "kwQX-0707");
 }
 
 TEST(ServerControlTest, RefusesAnswersThatItCannotRead) {

@@ -52,8 +52,9 @@ std::optional<ma::AdapterInfo> readInfo(const std::string& adapter) {
 std::string domainOf(const utils::PCIAddr& address) {
     const std::string_view text = address.text;
     const bool isFull = std::ranges::count(text, ':') == 2;
-    const auto number = utils::parseNumber<std::uint32_t>(text.substr(0, text.find(':')), 16);
-    return isFull && number.value_or(0) != 0 ? std::string(text.substr(0, text.find(':') + 1)) : "";
+    const std::string_view domain = text.substr(0, text.find(':'));
+    const bool isFirst = domain.find_first_not_of('0') == std::string_view::npos;
+    return isFull && !isFirst ? std::string(domain) + ':' : "";
 }
 
 std::vector<Identification> identify(const std::string& address, const std::optional<ma::AdapterInfo>& info,

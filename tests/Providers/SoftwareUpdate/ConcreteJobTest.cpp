@@ -63,6 +63,17 @@ TEST_F(ConcreteJobTest, StartsNewAndIsStartedOnce) {
     EXPECT_EQ(job->getFlashImage(), nullptr) << "it has megabytes";
     EXPECT_EQ(job->requestStateChange(RequestedStateStart, utils::Time()), 4097U);
     EXPECT_TRUE(test::SyslogCapture::contains("Cannot start job that is not in 'NEW' state"));
+    // One that does not come to its end is waited for in steps of 50 ms.
+    m_backend->hook = nullptr;
+    const auto held = makeJob();
+    m_backend->hold("writeFlashImage");
+    EXPECT_EQ(held->requestStateChange(RequestedStateStart, utils::Time()), 0U);
+    m_backend->waitUntilHeld();
+    EXPECT_TRUE(held->threadControl(ThreadTerminate, 100));
+    EXPECT_FALSE(held->threadControl(ThreadTerminate, 101));
+    m_backend->letGo();
+    while (!held->threadControl(ThreadDispose, 0))
+        utils::Thread::msleep(2);
     job->setLastError(7, "afterwards");
     job->refresh();
     EXPECT_EQ(job->ErrorDescription.get(), "afterwards") << "an end that was served may change";

@@ -41,7 +41,8 @@ class FailingSink : public core::UpdateSink {
     std::future<core::ImageFacts> examine(std::span<const std::uint8_t>) noexcept override { return {}; }
     void refused(const core::UpdateAttempt& attempt, unsigned int returnValue, core::ReasonId reason,
                  const std::string& text) noexcept override {
-        said += attempt.caller.principal + " " + std::to_string(returnValue) + " " +
+        said += attempt.caller.principal + " " + attempt.adapter + " " + attempt.uri + " " +
+                std::to_string(attempt.options.size()) + " " + std::to_string(returnValue) + " " +
                 core::reasonCode(reason) + ": " + text + "\n";
     }
     std::string problem() override { return m_problem; }
@@ -354,8 +355,8 @@ TEST_F(MethodsTest, InstallsNothingWithoutTheHistoryThatThePolicyRequires) {
     expectRefused();
     sink->m_problem.clear();
     expectRefused();
-    EXPECT_EQ(sink->said, "alice 2 QX-0503: " + text + "the disk is full\nalice 2 QX-0503: " + text +
-                              "its record was not written in time\n");
+    const std::string each = "alice eth0 " + goodImage() + " 1 2 QX-0503: " + text;
+    EXPECT_EQ(sink->said, each + "the disk is full\n" + each + "its record was not written in time\n");
     m_folder.write("policy.toml", "history = \"off\"\n");
     EXPECT_EQ(install("file:///none", "eth0").returnValue, MethodReturn::InvalidParameter);
     m_folder.write("policy.toml", "history = \"wanted\"\n");
