@@ -2,7 +2,8 @@
 #include "Host/Server/AnswerBody.h"
 
 #include <memory>
-#include <numeric>
+
+#include "CimXml/Response.h"
 
 namespace host {
 
@@ -15,11 +16,6 @@ struct AnswerBody {
     std::size_t piece = 0;   ///< the one that is sent
     std::size_t offset = 0;  ///< how much of it was
 };
-
-std::uint64_t bytesOf(const cimxml::Pieces& pieces) {
-    const auto add = [](std::uint64_t sum, const std::string& piece) { return sum + piece.size(); };
-    return std::accumulate(pieces.begin(), pieces.end(), std::uint64_t{0}, add);
-}
 
 void freeBody(void* body) {
     delete static_cast<AnswerBody*>(body);
@@ -49,8 +45,8 @@ MHD_Response* makeResponse(HttpAnswer& answer) {
     if (pieces.empty()) pieces.emplace_back();
     MHD_Response* response = isWhole ? ::MHD_create_response_from_buffer_with_free_callback_cls(
                                            pieces.front().size(), pieces.front().data(), freeBody, body.get())
-                                     : ::MHD_create_response_from_callback(bytesOf(pieces), kBlock, giveBytes,
-                                                                           body.get(), freeBody);
+                                     : ::MHD_create_response_from_callback(cimxml::sizeOf(pieces), kBlock,
+                                                                           giveBytes, body.get(), freeBody);
     if (response != nullptr) static_cast<void>(body.release());
     return response;
 }
