@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Indications/Subscriptions/Instances.h"
 
+#include <algorithm>
 #include <utility>
 
 #include "Indications/Subscriptions/Classes.h"
@@ -114,7 +115,7 @@ InstanceValue instanceOf(const Subscription& subscription, std::uint64_t state, 
         const std::uint64_t passed = (now - subscription.start) / 1'000'000;
         filling.number("SubscriptionDuration", CimType::Uint64, *subscription.duration)
             .number("SubscriptionTimeRemaining", CimType::Uint64,
-                    passed < *subscription.duration ? *subscription.duration - passed : 0);
+                    *subscription.duration - std::min(passed, *subscription.duration));
     } else {
         filling.add("SubscriptionDuration", CimValue::null(CimType::Uint64))
             .add("SubscriptionTimeRemaining", CimValue::null(CimType::Uint64));
