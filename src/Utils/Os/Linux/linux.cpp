@@ -36,16 +36,23 @@ struct CloseDirectory {
 };
 using Directory = std::unique_ptr<DIR, CloseDirectory>;
 
-/// Fills the buffer as far as the file goes; returns 0, or the errno value of what stopped it.
-int readUpTo(const Descriptor& file, std::span<std::uint8_t> buffer, std::size_t& count) noexcept {
-    for (count = 0; count < buffer.size();) {
-        const ssize_t result = read(file.number(), buffer.data() + count, buffer.size() - count);
+/// How far a file has filled a buffer, and the errno value of what stopped it before its end.
+struct Filling {
+    std::size_t count = 0;
+    int error = 0;
+};
+
+Filling fill(const Descriptor& file, std::span<std::uint8_t> buffer) noexcept {
+    Filling filling;
+    while (filling.count < buffer.size()) {
+        const ssize_t result =
+            read(file.number(), buffer.data() + filling.count, buffer.size() - filling.count);
         if (result < 0 && errno == EINTR) continue;
-        if (result < 0) return errno;
-        if (result == 0) break;
-        count += static_cast<std::size_t>(result);
+        if (result < 0) filling.error = errno;
+        if (result <= 0) break;
+        filling.count += static_cast<std::size_t>(result);
     }
-    return 0;
+    return filling;
 }
 
 [[noreturn]] void failToOpen(const std::string& path) {
@@ -108,9 +115,7 @@ std::size_t readFile(const std::string& path, std::span<std::uint8_t> buffer) no
     if (stat(path.c_str(), &status) != 0 || !S_ISREG(status.st_mode)) return 0;
     const Descriptor file(openForReading(path));
     if (!file.isOpen() || fstat(file.number(), &status) != 0 || !S_ISREG(status.st_mode)) return 0;
-    std::size_t count = 0;
-    readUpTo(file, buffer, count);
-    return count;
+    return fill(file, buffer).count;
 }
 
 std::optional<std::vector<std::uint8_t>> readWholeFile(const std::string& path, std::size_t most) {
@@ -126,10 +131,10 @@ std::optional<std::vector<std::uint8_t>> readWholeFile(const std::string& path, 
         const std::size_t length = bytes.size();
         bytes.resize(std::min(most, length + step));
         step = std::min(step * 4, kLargestStep);
-        std::size_t count = 0;
-        error = readUpTo(file, std::span(bytes).subspan(length), count);
-        more = length + count == bytes.size();
-        bytes.resize(length + count);
+        const Filling filling = fill(file, std::span(bytes).subspan(length));
+        error = filling.error;
+        more = length + filling.count == bytes.size();
+        bytes.resize(length + filling.count);
     }
     if (error != 0) throw std::system_error(error, std::generic_category(), "cannot read " + path);
     return bytes;
