@@ -133,6 +133,15 @@ TEST_P(CmpiHostileTest, TestsBitsOfStatesAndRefusesTypesThatItDoesNotTake) {
         EXPECT_EQ(getWithKey(type, std::uint64_t{1}), ReturnCode::Ok);
         EXPECT_NE(getWithKey(type, ~std::uint64_t{0}), ReturnCode::Ok);
     }
+    const std::pair<std::uint64_t, const char*> units[] = {
+        {0x7a, "z"},        {0x7f, "\x7f"},     {0x80, "\u0080"},
+        {0x7ff, "\u07ff"},  {0x800, "\u0800"},  {0xd7ff, "\xED\x9F\xBF"},
+        {0xd800, "\ufffd"}, {0xdfff, "\ufffd"}, {0xe000, "\ue000"}};
+    for (const auto& [unit, text] : units) {
+        m_gadgets.add(text, 1);
+        const test::Entry key("ID", CimValue::of(CimType::Char16, unit));
+        EXPECT_EQ(send(m_get, [&](Call& call) { call.path.entries[0] = key; }), ReturnCode::Ok) << unit;
+    }
     for (const int code : {0x0001, 0x1000, 0x1200, 0x1500, 0x1900, 0x1a00, 0x2001, 0x3000, 0xffff}) {
         const auto type = static_cast<cmpi::Type>(code);
         const auto lie = [=](test::Entry& entry) { entry.type = type; };

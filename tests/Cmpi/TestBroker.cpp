@@ -5,6 +5,7 @@
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
+#include <filesystem>
 #include <sstream>
 
 namespace test {
@@ -65,7 +66,10 @@ CimScalar scalarOf(CimType type, const Value& value) {
     if (core::isSigned(type)) return static_cast<std::int64_t>(bits << unused) >> unused;
     if (core::isReal(type)) return type == CimType::Real32 ? double{value.real32} : value.real64;
     if (type == CimType::Boolean) return bits != 0;
-    if (type == CimType::Char16) return std::string(1, static_cast<char>(bits));
+    if (type == CimType::Char16) {
+        const std::u16string unit(1, static_cast<char16_t>(bits));
+        return std::filesystem::path(unit).string();  // as UTF-8
+    }
     if (type == CimType::Reference) return pathOf(at(value.ref), at(value.ref).entries);
     if (type == CimType::Datetime) return *core::parseDatetime(at(value.dateTime).text);
     return at(value.string).text;
