@@ -366,6 +366,7 @@ TEST_F(CardVerbTest, TellsOfTheCardBeforeAndOfTheResetAfterAnUpdate) {
     const std::string unchecked =
         "It could not be checked which card the file is for. The adapter judges that when the image is "
         "written.\n";
+    EXPECT_TRUE(m_lines.str().starts_with("eth0: 0 %\n")) << "of how much is not known: " << m_lines.str();
     EXPECT_EQ(m_out.str(), unchecked + kCard +
                                "eth0 was updated.\n  IMG_PXE   1 (unchanged)\n  IMG_UEFI  0 (unchanged)\n"
                                "It takes effect after a reset: \"quenxctl activate --target eth0\" does that "
