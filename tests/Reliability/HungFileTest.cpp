@@ -48,8 +48,9 @@ TEST_F(HungFileTest, EndsTheUpdateAsAReadErrorAndLetsOthersGoOn) {
         m_held = held;
         test::SyslogCapture::clear();
         EXPECT_EQ(install(m_uri, "eth0").returnValue, 2U);
-        EXPECT_TRUE(test::SyslogCapture::contains("Image read error: " + m_uri + " (" + m_path + ")"));
-        EXPECT_TRUE(test::SyslogCapture::contains("did not answer for 1 seconds"));
+        EXPECT_TRUE(test::SyslogCapture::says("Image read error: " + m_uri + " (" + m_path + ")"));
+        EXPECT_TRUE(test::SyslogCapture::says(
+            "is not read: its file system did not answer for 1 seconds, now or earlier"));
         EXPECT_EQ(claim(), "");
         // Nobody asks again, by whatever name, while the first one hangs.
         EXPECT_EQ(install("file:///." + m_path, "eth0").returnValue, 2U);
@@ -80,7 +81,8 @@ TEST_F(HungFileTest, ReadsNoImageThatIsLargerThanAllowed) {
     EXPECT_EQ(install(m_uri, "eth0").returnValue, 2U);
     EXPECT_EQ(m_accesses, 2) << "it was read";
     EXPECT_EQ(claim(), "");
-    EXPECT_TRUE(test::SyslogCapture::contains(m_path + " has " + length + " bytes, more than the 512"));
+    EXPECT_TRUE(test::SyslogCapture::says(m_path + " has " + length +
+                                          " bytes, more than the 512 that LargestImage allows"));
     m_folder.write("quenx.conf", "LargestImage=" + length + "\n");
     EXPECT_EQ(install(m_uri, "eth0").returnValue, 4096U);
 }

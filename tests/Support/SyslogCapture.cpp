@@ -63,6 +63,12 @@ std::size_t SyslogCapture::count(std::string_view part) {
     return static_cast<std::size_t>(std::ranges::count_if(lines(), holdsPart));
 }
 
+bool SyslogCapture::says(std::string_view text) {
+    return std::ranges::any_of(lines(), [text](const SyslogLine& line) {
+        return line.text.ends_with(text) || line.text.find(std::string(text) + '"') != std::string::npos;
+    });
+}
+
 std::vector<std::string> SyslogCapture::messages(std::string_view level) {
     const std::string begin = "[" + std::string(level) + "] \"";
     std::vector<std::string> found;

@@ -36,6 +36,8 @@ class SyslogCapture {
     /// The number of lines that contain the text.
     static std::size_t count(std::string_view part);
     static bool contains(std::string_view part) { return count(part) != 0; }
+    /// Whether a line has the text up to the end of the line, or of what stands there in quotes.
+    static bool says(std::string_view text);
     /// The messages of the lines "[level] "message" (...)", in order; other lines are left out.
     static std::vector<std::string> messages(std::string_view level = "debug");
     /// The last opening since clear().

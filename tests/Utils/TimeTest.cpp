@@ -116,5 +116,5 @@ TEST(TimeTest, TakesNeitherKindForTheOther) {
     EXPECT_THROW(Time(5ULL).decodeToDate(i, i, i, i, i, i), utils::Exception);
     EXPECT_THROW(before.decodeToPeriod(i, i, i, i), utils::Exception);
     for (const char* condition : {"dtStart.isTimestamp == true", "this->isTimestamp", "this->isPeriod()"})
-        EXPECT_TRUE(test::SyslogCapture::contains("Assertion failed: '" + std::string(condition) + "'"));
+        EXPECT_TRUE(test::SyslogCapture::says("Assertion failed: '" + std::string(condition) + "'"));
 }

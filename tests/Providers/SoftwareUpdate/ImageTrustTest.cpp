@@ -39,7 +39,7 @@ class ImageTrustTest : public test::UpdateTest {
         const test::CallResult result = install(m_uri, "eth0");
         EXPECT_EQ(result.returnValue, MethodReturn::UnsupportedTargetType);
         EXPECT_EQ(core::reasonCode(result.reason), core::reasonCode(reason));
-        EXPECT_TRUE(m_log.contains("Image " + m_uri + " may not be installed: " + why)) << why;
+        EXPECT_TRUE(m_log.says("Image " + m_uri + " may not be installed: " + why)) << why;
         EXPECT_EQ(claim(), "") << "others may have the adapter";
     }
 

@@ -286,7 +286,7 @@ TEST_F(SiblingsTest, WhatTheyThrowIsAnUnspecifiedError) {
     EXPECT_EQ(result.returnValue, MethodReturn::UnspecifiedError);
     EXPECT_EQ(result.reason, core::ReasonId::LookUpFailed);
     EXPECT_EQ(result.error, "");
-    EXPECT_TRUE(test::SyslogCapture::contains("Unspecified Error for '" + m_controller.toString() + "'"));
+    EXPECT_TRUE(test::SyslogCapture::says("Unspecified Error for '" + m_controller.toString() + "'"));
     EXPECT_EQ(claim(), "");
 }
 
@@ -349,7 +349,7 @@ TEST_F(MethodsTest, InstallsNothingWithoutTheHistoryThatThePolicyRequires) {
     };
     expectRefused();
     const std::string text = "The policy requires a history of updates, and none can be written: ";
-    EXPECT_TRUE(test::SyslogCapture::contains(text + "this program keeps none"));
+    EXPECT_TRUE(test::SyslogCapture::says(text + "this program keeps none"));
     const auto sink = std::make_shared<FailingSink>();
     std::optional<core::InstalledSink> installed(sink);
     expectRefused();

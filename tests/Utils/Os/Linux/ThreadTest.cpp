@@ -96,8 +96,8 @@ TEST_F(ThreadTest, AloneEndsOnAnExceptionOfTheBody) {
     for (Worker* const worker : {&known, &unknown})
         worker->start();
     waitUntil([] { return SyslogCapture::messages("error").size() == 2; });
-    EXPECT_TRUE(SyslogCapture::contains("Thread " + known.address() + " ended by an exception: %n"));
-    EXPECT_TRUE(SyslogCapture::contains("Thread " + unknown.address() + " ended by an unknown exception"));
+    EXPECT_TRUE(SyslogCapture::says("Thread " + known.address() + " ended by an exception: %n"));
+    EXPECT_TRUE(SyslogCapture::says("Thread " + unknown.address() + " ended by an unknown exception"));
 }
 
 TEST(MutexTest, CountsLocksAndUnlocks) {
