@@ -19,16 +19,16 @@ using history::Record;
 constexpr std::int64_t kSecond = 1'000'000;  // microseconds
 
 /// Minutes east of UTC in "Z", "+01:00" or "-0130"; nothing for another text.
-std::optional<int> zoneOf(const std::string& text) {
+std::optional<int> zoneOf(std::string_view text) {
     if (text == "Z" || text == "z") return 0;
-    char sign = 0;
-    int hours = 0;
-    int minutes = 0;
-    int length = 0;
-    const bool isRead = std::sscanf(text.c_str(), "%c%2d:%2d%n", &sign, &hours, &minutes, &length) == 3 ||
-                        std::sscanf(text.c_str(), "%c%2d%2d%n", &sign, &hours, &minutes, &length) == 3;
-    if (!isRead || static_cast<std::size_t>(length) != text.size() || (sign != '+' && sign != '-')) return {};
-    return (sign == '-' ? -1 : 1) * (hours * 60 + minutes);
+    const bool isWest = text.starts_with('-');
+    if (!isWest && !text.starts_with('+')) return std::nullopt;
+    std::string digits(text.substr(1));
+    if (digits.size() == 5 && digits[2] == ':') digits.erase(2, 1);
+    if (digits.size() != 4 || !std::ranges::all_of(digits, utils::isDigit)) return std::nullopt;
+    const int number = utils::parseNumber<int>(digits).value_or(0);
+    const int minutes = number / 100 * 60 + number % 100;
+    return isWest ? -minutes : minutes;
 }
 
 std::int64_t timeOf(const std::string& text) {
@@ -43,7 +43,8 @@ std::int64_t timeOf(const std::string& text) {
         // There is no 31st of February, which the library would take for one of March.
         if (std::tm copy = time; ::timegm(&copy) == -1 || copy.tm_mday != day) break;
         if (*rest == '\0') return std::int64_t{::mktime(&time)} * kSecond;
-        if (const auto zone = zoneOf(rest)) return (std::int64_t{::timegm(&time)} - *zone * 60) * kSecond;
+        constexpr std::int64_t kMinute = 60 * kSecond;
+        if (const auto zone = zoneOf(rest)) return ::timegm(&time) * kSecond - *zone * kMinute;
     }
     throw CommandError(ExitStatus::WrongUse, "--since is \"" + text + "\", which is not a time.",
                        "Write it as 2026-11-22 or 2026-11-22T16:00, with Z or +01:00 for a zone.");
