@@ -29,13 +29,13 @@ constexpr const char* kRealm = "Basic realm=\"Quenx management\", charset=\"UTF-
 
 using Text = std::optional<std::string>;
 
-template <Text HttpHead::*place>
+template <Text HttpHead::*Place>
 void keep(HttpHead& head, const char* value) {
-    head.*place = value;
+    head.*Place = value;
 }
-template <Text cimxml::RequestHeaders::*place>
+template <Text cimxml::RequestHeaders::*Place>
 void keep(HttpHead& head, const char* value) {
-    head.cim.*place = value;
+    head.cim.*Place = value;
 }
 
 /// A header that is used.
