@@ -125,7 +125,7 @@ InstanceValue instanceOf(const Subscription& subscription, std::uint64_t state, 
 
 InstanceValue serviceInstance(const DeliverySettings& settings, const std::string& systemName) {
     constexpr std::uint64_t kIgnore = 4;  // a listener that is gone stays subscribed
-    constexpr std::uint64_t kThirtyDays = 30 * 86400;
+    constexpr std::uint64_t kThirtyDays = 30ULL * 86400;
     const auto pause = std::chrono::ceil<std::chrono::seconds>(settings.retryPause);
     return Filling(systemPath(kService, "quenx-cimd", systemName))
         .text("ElementName", "Quenx indication service")
