@@ -170,7 +170,7 @@ class TellingServer : public core::CimRequests {
 
 class ListenVerbTest : public ::testing::Test {
   protected:
-    ExitStatus listen(std::uint64_t count, bool isInProcess = false) {
+    ExitStatus listen(std::uint32_t count, bool isInProcess = false) {
         const cli::Connection connection{.operations = m_server,
                                          .history = nullptr,
                                          .isInProcess = isInProcess,

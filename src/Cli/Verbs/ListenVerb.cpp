@@ -165,7 +165,7 @@ ExitStatus listen(Context& context, const VerbOptions& options) {
     context.error << "Listening at " << listener.url() << " until it is interrupted.\n";
     auto looked = std::chrono::steady_clock::now();
     bool wasReached = true;
-    for (std::uint64_t count = 0; options.listening.count == 0 || count < options.listening.count;) {
+    for (std::uint32_t count = 0; options.listening.count == 0 || count < options.listening.count;) {
         if (context.following.interrupted()) break;
         if (const auto delivered = listener.next(std::chrono::milliseconds(200))) {
             try {

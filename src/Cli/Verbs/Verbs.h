@@ -40,7 +40,7 @@ struct HistoryOptions {
 struct ListenOptions {
     std::string address;      ///< of this machine; empty for loopback
     std::uint16_t port = 0;   ///< 0 takes a free one
-    std::uint64_t count = 0;  ///< 0 for no end
+    std::uint32_t count = 0;  ///< 0 for no end
 };
 
 /// What a word is completed to.
