@@ -1,7 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Control/Sha256.h"
 
-#include <dlfcn.h>
 #include <gnutls/crypto.h>
 #include <unistd.h>
 
@@ -13,6 +12,7 @@
 #include <system_error>
 #include <vector>
 
+#include "Utils/Os/Linux/LoadedLibrary.h"
 #include "Utils/Utils.h"
 
 namespace control {
@@ -26,27 +26,17 @@ struct HashFunctions {
     decltype(&::gnutls_hash_deinit) deinit;
 };
 
-[[noreturn]] void refuse(const char* file) {
-    const char* const why = ::dlerror();
-    throw std::runtime_error(std::string("cannot load the library for SHA-256 sums: ") +
-                             (why == nullptr ? file : why) + "; install the package libgnutls30");
-}
-
-/// Stays loaded.
 HashFunctions load() {
-    // Its binary interface; the headers that this is compiled with are the same one's.
-    constexpr const char* kFile = "libgnutls.so.30";
-    void* const library = ::dlopen(kFile, RTLD_NOW | RTLD_LOCAL);
-    if (library == nullptr) refuse(kFile);
-    const auto find = [library]<class Function>(const char* name, Function& function) {
-        function = reinterpret_cast<Function>(::dlsym(library, name));
-        if (function == nullptr) refuse(kFile);
-    };
+    // The headers that this is compiled with are the same interface's.
+    os::LoadedLibrary library("libgnutls.so.30");
     HashFunctions found{};
-    find("gnutls_hash_init", found.init);
-    find("gnutls_hash", found.add);
-    find("gnutls_hash_output", found.output);
-    find("gnutls_hash_deinit", found.deinit);
+    library.find("gnutls_hash_init", found.init);
+    library.find("gnutls_hash", found.add);
+    library.find("gnutls_hash_output", found.output);
+    library.find("gnutls_hash_deinit", found.deinit);
+    if (!library.problem().empty())
+        throw std::runtime_error("cannot load the library for SHA-256 sums: " + library.problem() +
+                                 "; install the package libgnutls30");
     return found;
 }
 

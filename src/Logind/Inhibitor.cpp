@@ -1,7 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Logind/Inhibitor.h"
 
-#include <dlfcn.h>
 #include <fcntl.h>
 #include <systemd/sd-bus.h>
 #include <unistd.h>
@@ -10,8 +9,8 @@
 #include <chrono>
 #include <cstring>
 #include <memory>
-#include <type_traits>
 
+#include "Utils/Os/Linux/LoadedLibrary.h"
 #include "Utils/Os/Linux/linux.h"
 
 namespace logind {
@@ -39,27 +38,20 @@ struct Library {
 };
 
 Library load() {
-    // Its binary interface; the headers that this is compiled with are the same one's.
-    constexpr const char* kFile = "libsystemd.so.0";
+    // The headers that this is compiled with are the same interface's.
+    os::LoadedLibrary library("libsystemd.so.0");
     Library found;
-    void* const library = ::dlopen(kFile, RTLD_NOW);
-    const auto find = [&](const char* name, auto& function) {
-        using Function = std::remove_reference_t<decltype(function)>;
-        if (library != nullptr) function = reinterpret_cast<Function>(::dlsym(library, name));
-        if (function != nullptr || !found.problem.empty()) return;
-        const char* const why = ::dlerror();
-        found.problem = why == nullptr ? name : why;
-    };
-    find("sd_bus_open_system", found.open);
-    find("sd_bus_close_unref", found.close);
-    find("sd_bus_is_ready", found.isReady);
-    find("sd_bus_process", found.process);
-    find("sd_bus_wait", found.wait);
-    find("sd_bus_set_method_call_timeout", found.setTimeout);
-    find("sd_bus_call_method", found.call);
-    find("sd_bus_message_read", found.read);
-    find("sd_bus_message_unref", found.endMessage);
-    find("sd_bus_error_free", found.endError);
+    library.find("sd_bus_open_system", found.open);
+    library.find("sd_bus_close_unref", found.close);
+    library.find("sd_bus_is_ready", found.isReady);
+    library.find("sd_bus_process", found.process);
+    library.find("sd_bus_wait", found.wait);
+    library.find("sd_bus_set_method_call_timeout", found.setTimeout);
+    library.find("sd_bus_call_method", found.call);
+    library.find("sd_bus_message_read", found.read);
+    library.find("sd_bus_message_unref", found.endMessage);
+    library.find("sd_bus_error_free", found.endError);
+    found.problem = library.problem();
     return found;
 }
 
