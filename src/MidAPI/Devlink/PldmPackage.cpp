@@ -180,16 +180,18 @@ Fields checkedHeader(Bytes file, unsigned revision) {
     return header;
 }
 
-/// Images that a record names must be there, and all of them must lie behind the header.
+/// Images that a record names must be there, and all of them must lie behind the header and its checksum.
 void checkImages(const PldmPackage& package, const Fields& header, std::size_t fileSize) {
     for (const PldmDevice& device : package.devices) {
         if (!device.components.empty() && device.components.back() >= package.components.size())
             header.fail("names image " + std::to_string(device.components.back() + 1) + " of " +
                         std::to_string(package.components.size()));
     }
+    const std::size_t end = header.offset() + kChecksumLength;
     for (const PldmComponent& component : package.components) {
-        if (fitsIn(component.offset, component.size, fileSize) && component.offset >= header.offset())
-            continue;
+        if (component.offset < end)
+            throw Flaw{component.offset, "has an image that begins inside the header"};
+        if (fitsIn(component.offset, component.size, fileSize)) continue;
         throw Flaw{component.offset, "has an image of " + std::to_string(component.size) +
                                          " bytes that lies outside the file: it may be cut short"};
     }

@@ -107,8 +107,8 @@ TEST(PldmPackageTest, NamesWhatIsBroken) {
         if (same != last) said += "to " + std::to_string(length) + ": " + error + "\n";
         last = same;
     }
-    for (const char* name : {"wrong checksum", "image cut short", "image that is not there",
-                             "revision 2 by its number alone", "short record"})
+    for (const char* name : {"wrong checksum", "image cut short", "image inside the checksum",
+                             "image that is not there", "revision 2 by its number alone", "short record"})
         said += std::string(name) + ": " + errorOf(package(name)) + "\n";
     const Bytes expected = test::readTestFile(QUENX_MIDAPI_TEST_DIR "/samples/package-errors");
     EXPECT_EQ(said, std::string(expected.begin(), expected.end()));
