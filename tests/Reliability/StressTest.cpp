@@ -159,13 +159,19 @@ TEST_F(StressTest, LosesNothing) {
     const auto hasMetAll = [&] { return m_refused > 0 && m_checked > 0 && m_deleted > 0; };
     run(std::chrono::milliseconds(300), [&] { return m_started >= 10 && hasMetAll(); });
     cleanUp();
-    const std::int64_t before = test::liveBytes();
-
-    const std::uint64_t wanted = m_started + test::effort.jobs;
-    run(test::effort.stress, [&] { return m_started >= wanted && hasMetAll(); });
-    cleanUp();
-    // But for what is kept once, as the room of lists for more elements: each job takes about 10 KB.
-    EXPECT_LT(test::liveBytes() - before, 5000);
+    // But for what is kept once, as the room of lists for more elements: each job takes about 10 KB. What is
+    // lost is lost in each round, what is kept once in one of them.
+    constexpr int kRounds = 3;
+    std::int64_t kept = 0;
+    for (int round = 0; round < kRounds; ++round) {
+        const std::int64_t before = test::liveBytes();
+        const std::uint64_t wanted = m_started + test::effort.jobs;
+        run(test::effort.stress, [&] { return m_started >= wanted && hasMetAll(); });
+        cleanUp();
+        kept = test::liveBytes() - before;
+        if (kept < 5000) break;
+    }
+    EXPECT_LT(kept, 5000);
     EXPECT_EQ(claim(), "");
     // Every job that was started has run, and each flash has ended well.
     EXPECT_EQ(static_cast<std::uint64_t>(JobThread::executionCount - executionsBefore), m_started);
