@@ -1,5 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 #include <gmock/gmock.h>
+#include <unistd.h>
 
 #include <cstdlib>
 #include <filesystem>
@@ -191,6 +192,31 @@ TEST(LocalSocketTest, ReplacesWhatAKilledDaemonLeftAndNothingElse) {
     EXPECT_THAT([&] { const LocalSocket socket(path); },
                 ThrowsMessage<host::ListenError>(HasSubstr("there is a file that is not a socket")));
     EXPECT_TRUE(fs::is_symlink(path));
+}
+
+TEST(LocalSocketTest, StandsInAFolderThatNobodyElseWritesTo) {
+    const test::TempFolder folder;
+    const std::string shared = folder / "shared";
+    const auto check = [&] { LocalSocket::check(shared + "/socket"); };
+    const auto refuses = [](const std::string& why) {
+        return ThrowsMessage<host::ListenError>(HasSubstr(why));
+    };
+    EXPECT_THAT(check,
+                refuses("No such file or directory. Set listen.socket to a path in a folder of root's"));
+    folder.write("shared", "");
+    EXPECT_THAT(check, refuses("Not a directory. Set listen.socket"));
+    fs::remove(shared);
+    fs::create_directory(shared);
+    check();
+    for (const fs::perms more : {fs::perms::group_write, fs::perms::others_write}) {
+        fs::permissions(shared, fs::perms::owner_all | more);
+        EXPECT_THAT(check, refuses("others can write to " + shared + "."));
+    }
+    fs::permissions(shared, fs::perms::owner_all);
+    // Only root can give a folder away.
+    if (::chown(shared.c_str(), 65534, 65534) == 0 && ::geteuid() == 0) {
+        EXPECT_THAT(check, refuses("others can write to " + shared + "."));
+    }
 }
 
 }  // namespace
