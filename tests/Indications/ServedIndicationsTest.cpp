@@ -3,6 +3,7 @@
 #include <gmock/gmock.h>
 
 #include <chrono>
+#include <filesystem>
 #include <thread>
 
 #include "Indications/OneUpdate.h"
@@ -172,6 +173,32 @@ TEST(ServedIndicationsTest, SayWhatIsWrongWithASubscriptionAndKeepNothingOfIt) {
     EXPECT_EQ(filter(kAll), "2 user guest may only read");
     EXPECT_EQ(client.remove(made).said(), "2 user guest may only read");
     EXPECT_EQ(client.value(made, "Name"), "f");
+}
+
+TEST(ServedIndicationsTest, NeedTheHttpLibraryFromTheFirstDestinationOn) {
+    const test::TempFolder folder;
+    folder.write("libcurl.so.4", "");
+    const std::string place = "LD_LIBRARY_PATH=" + folder.path();
+    const RunningDaemon daemon({}, {place});
+    const SubscriptionClient client(daemon);
+    const auto destination = [&] {
+        return client
+            .create("CIM_ListenerDestinationCIMXML",
+                    SubscriptionClient::keys("CIM_ListenerDestinationCIMXML", "d") +
+                        SubscriptionClient::property("Destination", "string", "http://localhost:9"))
+            .said();
+    };
+    const std::string problem =
+        "annot load the HTTP library: " + (folder / "libcurl.so.4") + ": file too short";
+    EXPECT_EQ(destination(), "1 c" + problem + "; install the package libcurl4");
+    const auto asked = test::run({QUENXCTL, "--server", "http://localhost:9", "jobs"}, {place});
+    EXPECT_EQ(asked.error,
+              "quenxctl: C" + problem +
+                  ".\nInstall the package libcurl4, or run quenxctl on the server itself, without "
+                  "--server.\n");
+    // Once it is there, nothing has to be started anew.
+    std::filesystem::remove(folder / "libcurl.so.4");
+    EXPECT_EQ(destination(), "0 ");
 }
 
 TEST(ServedIndicationsTest, KeepNoMoreThanTheSettingsSay) {

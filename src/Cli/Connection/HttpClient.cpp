@@ -18,7 +18,16 @@ namespace cli {
 
 namespace {
 
+using control::curl;
+using control::CurlLibrary;
 using UrlParts = std::unique_ptr<CURLU, decltype(CurlLibrary::urlCleanup)>;
+
+/// Who names a server needs it.
+void requireCurl() try { curl(); } catch (const control::NoCurlLibrary& error) {
+    throw CommandError(
+        ExitStatus::Failed, "Cannot load the HTTP library: " + error.why() + ".",
+        "Install the package libcurl4, or run quenxctl on the server itself, without --server.");
+}
 
 [[noreturn]] void refuseUrl(const std::string& text, const std::string& why) {
     // What stands before an @ may be a password.
@@ -158,6 +167,7 @@ void requireOk(const HttpReply& reply) {
 
 ServerUrl::ServerUrl(const std::string& text) {
     constexpr std::string_view kLocal = "unix:";
+    requireCurl();
     if (text.starts_with(kLocal)) {
         m_socket = text.size() == kLocal.size() ? localSocket() : text.substr(kLocal.size());
         m_text = std::string(kLocal) + m_socket;

@@ -8,7 +8,7 @@
 #include <vector>
 
 #include "Cli/Connection/Connection.h"
-#include "Cli/Connection/CurlLibrary.h"
+#include "Control/CurlLibrary.h"
 
 namespace cli {
 
@@ -62,13 +62,13 @@ class HttpClient {
   private:
     template <class T>
     void set(CURLoption option, T value) {
-        curl().easySetopt(m_curl.get(), option, value);
+        control::curl().easySetopt(m_curl.get(), option, value);
     }
     void bePatient(bool sendsFile);
     HttpReply perform(const std::vector<std::string>& headers, Sending sending);
     [[noreturn]] void refuse(CURLcode code, bool isTooLarge) const;
 
-    std::unique_ptr<CURL, decltype(CurlLibrary::easyCleanup)> m_curl;
+    std::unique_ptr<CURL, decltype(control::CurlLibrary::easyCleanup)> m_curl;
     std::array<char, CURL_ERROR_SIZE> m_error{};
     std::string m_url;
     std::string m_root;  ///< scheme, host and port

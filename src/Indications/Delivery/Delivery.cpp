@@ -16,15 +16,18 @@ namespace indications {
 
 namespace {
 
+using control::curl;
+using control::CurlLibrary;
+
 constexpr std::size_t kMostTransfers = 16;
 /// To those that have not taken the last one, or none yet: each may take all the time there is.
 constexpr std::size_t kMostToUnproven = 8;
 
-using Multi = std::unique_ptr<CURLM, decltype(&::curl_multi_cleanup)>;
+using Multi = std::unique_ptr<CURLM, decltype(CurlLibrary::multiCleanup)>;
 
 Multi newMulti() {
-    static const CURLcode prepared = ::curl_global_init(CURL_GLOBAL_DEFAULT);
-    Multi multi(prepared == CURLE_OK ? ::curl_multi_init() : nullptr, ::curl_multi_cleanup);
+    static const CURLcode prepared = curl().globalInit(CURL_GLOBAL_DEFAULT);
+    Multi multi(prepared == CURLE_OK ? curl().multiInit() : nullptr, curl().multiCleanup);
     if (multi == nullptr) throw std::bad_alloc();
     return multi;
 }
@@ -50,7 +53,7 @@ class Delivery::Courier : public utils::Thread {
         wake();
         shutdown();
         for (const UnderWay& each : m_underWay)
-            ::curl_multi_remove_handle(m_multi.get(), each.transfer->handle());
+            curl().multiRemoveHandle(m_multi.get(), each.transfer->handle());
     }
 
     void execute() override;
@@ -93,7 +96,7 @@ class Delivery::Courier : public utils::Thread {
         bool toUnproven = false;
     };
 
-    void wake() noexcept { ::curl_multi_wakeup(m_multi.get()); }
+    void wake() noexcept { curl().multiWakeup(m_multi.get()); }
     void makeRoom();
     void tellOverflow();
     void beginDue();
@@ -136,7 +139,7 @@ bool Delivery::Courier::begin(const std::string& destination, const std::shared_
     try {
         auto transfer = std::make_unique<Transfer>(target->url, target->policy, message->body, m_settings);
         m_underWay.push_back({destination, target, std::move(transfer), isUnproven});
-        if (::curl_multi_add_handle(m_multi.get(), m_underWay.back().transfer->handle()) == CURLM_OK)
+        if (curl().multiAddHandle(m_multi.get(), m_underWay.back().transfer->handle()) == CURLM_OK)
             return true;
         m_underWay.pop_back();
     } catch (const std::exception& error) {
@@ -204,13 +207,13 @@ void Delivery::Courier::end(UnderWay& done, CURLcode code) {
 
 void Delivery::Courier::endDone() {
     int left = 0;
-    while (const CURLMsg* message = ::curl_multi_info_read(m_multi.get(), &left)) {
+    while (const CURLMsg* message = curl().multiInfoRead(m_multi.get(), &left)) {
         if (message->msg != CURLMSG_DONE) continue;
         CURL* const handle = message->easy_handle;
         const CURLcode code = message->data.result;
         const auto found = std::ranges::find_if(
             m_underWay, [&](const UnderWay& each) { return each.transfer->handle() == handle; });
-        ::curl_multi_remove_handle(m_multi.get(), handle);
+        curl().multiRemoveHandle(m_multi.get(), handle);
         end(*found, code);
         m_underWay.erase(found);
     }
@@ -240,11 +243,11 @@ void Delivery::Courier::execute() {
         tellOverflow();
         if (!deadline) beginDue();
         int running = 0;
-        ::curl_multi_perform(m_multi.get(), &running);
+        curl().multiPerform(m_multi.get(), &running);
         const std::size_t before = m_underWay.size();
         endDone();
         if (m_underWay.size() != before) continue;  // there may be a next one
-        ::curl_multi_poll(m_multi.get(), nullptr, 0, deadline ? 10 : pause(), nullptr);
+        curl().multiPoll(m_multi.get(), nullptr, 0, deadline ? 10 : pause(), nullptr);
     }
 }
 

@@ -22,7 +22,7 @@ class Delivery {
   public:
     using Body = std::function<std::string(const Sequence&)>;
 
-    /// Throws utils::Exception where the system has no thread, std::bad_alloc.
+    /// Throws utils::Exception where the system has no thread, std::bad_alloc, control::NoCurlLibrary.
     explicit Delivery(DeliverySettings settings);
     /// Ends what is under way, if it ends in time, and drops the rest.
     ~Delivery();

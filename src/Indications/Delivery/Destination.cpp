@@ -1,17 +1,19 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Indications/Delivery/Destination.h"
 
-#include <curl/curl.h>
-
 #include <algorithm>
 #include <memory>
 #include <string_view>
 
+#include "Control/CurlLibrary.h"
 #include "Framework/Model/CimError.h"
 
 namespace indications {
 
 namespace {
+
+using control::curl;
+using control::CurlLibrary;
 
 /// Never with the URL in it, which may hold a password.
 [[noreturn]] void refuse(const std::string& reason) {
@@ -21,8 +23,8 @@ namespace {
 
 std::string partOf(CURLU* url, CURLUPart part) {
     char* text = nullptr;
-    if (::curl_url_get(url, part, &text, 0) != CURLUE_OK) return "";
-    const std::unique_ptr<char, decltype(&::curl_free)> owned(text, ::curl_free);
+    if (curl().urlGet(url, part, &text, 0) != CURLUE_OK) return "";
+    const std::unique_ptr<char, decltype(CurlLibrary::free)> owned(text, curl().free);
     return text;
 }
 
@@ -33,12 +35,12 @@ void requireDestination(const std::string& url) {
     if (url.size() > kLongestDestination) refuse("is longer than 1024 bytes");
     const auto isOfUrl = [](char each) { return each > ' ' && each < '\x7F'; };
     if (!std::ranges::all_of(url, isOfUrl)) refuse("holds a blank or a character that is none of a URL");
-    const std::unique_ptr<CURLU, decltype(&::curl_url_cleanup)> parts(::curl_url(), ::curl_url_cleanup);
+    const std::unique_ptr<CURLU, decltype(CurlLibrary::urlCleanup)> parts(curl().url(), curl().urlCleanup);
     if (parts == nullptr) throw std::bad_alloc();
     const CURLUcode error =
-        ::curl_url_set(parts.get(), CURLUPART_URL, url.c_str(),
-                       CURLU_NON_SUPPORT_SCHEME | CURLU_DEFAULT_SCHEME | CURLU_GUESS_SCHEME);
-    if (error != CURLUE_OK) refuse(std::string("is no URL: ") + ::curl_url_strerror(error));
+        curl().urlSet(parts.get(), CURLUPART_URL, url.c_str(),
+                      CURLU_NON_SUPPORT_SCHEME | CURLU_DEFAULT_SCHEME | CURLU_GUESS_SCHEME);
+    if (error != CURLUE_OK) refuse(std::string("is no URL: ") + curl().urlStrerror(error));
     const std::string scheme = partOf(parts.get(), CURLUPART_SCHEME);
     if (scheme != "http" && scheme != "https") refuse("has the scheme " + scheme);
     const bool hasSecrets =

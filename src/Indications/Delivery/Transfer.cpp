@@ -13,6 +13,8 @@ namespace indications {
 
 namespace {
 
+using control::curl;
+
 constexpr std::size_t kLongestAnswer = 64 << 10;
 
 /// All that the strictest listeners ask for. One that is not sent stands without a value: libcurl would wait
@@ -29,21 +31,21 @@ bool mayPass(long status) {
 
 template <class Value>
 void Transfer::set(CURLoption option, Value value) {
-    const CURLcode code = ::curl_easy_setopt(m_curl.get(), option, value);
+    const CURLcode code = curl().easySetopt(m_curl.get(), option, value);
     // What this library lacks would be missed in silence, such as a check of certificates.
     if (code == CURLE_OUT_OF_MEMORY) throw std::bad_alloc();
-    if (code != CURLE_OK) throw std::runtime_error(::curl_easy_strerror(code));
+    if (code != CURLE_OK) throw std::runtime_error(curl().easyStrerror(code));
 }
 
 Transfer::Transfer(const std::string& url, const AddressPolicy& policy, std::string body,
                    const DeliverySettings& settings)
     : m_policy(policy),
       m_body(std::move(body)),
-      m_curl(::curl_easy_init(), ::curl_easy_cleanup),
-      m_headers(nullptr, ::curl_slist_free_all) {
+      m_curl(curl().easyInit(), curl().easyCleanup),
+      m_headers(nullptr, curl().slistFreeAll) {
     if (m_curl == nullptr) throw std::bad_alloc();
     for (const char* header : kHeaders) {
-        curl_slist* const longer = ::curl_slist_append(m_headers.get(), header);
+        curl_slist* const longer = curl().slistAppend(m_headers.get(), header);
         if (longer == nullptr) throw std::bad_alloc();
         static_cast<void>(m_headers.release());
         m_headers.reset(longer);
@@ -110,20 +112,20 @@ Transfer::Result Transfer::result(CURLcode code) const {
         return {Outcome::Refused, "indications.destinations does not allow its address"};
     if (code != CURLE_OK && !m_isTooLong) {
         const bool isExplained = m_error.front() != '\0';
-        return {Outcome::Failed, isExplained ? m_error.data() : ::curl_easy_strerror(code)};
+        return {Outcome::Failed, isExplained ? m_error.data() : curl().easyStrerror(code)};
     }
     return resultOfAnswer();
 }
 
 std::string Transfer::address() const {
     const char* address = nullptr;
-    ::curl_easy_getinfo(m_curl.get(), CURLINFO_PRIMARY_IP, &address);
+    curl().easyGetinfo(m_curl.get(), CURLINFO_PRIMARY_IP, &address);
     return address == nullptr ? "" : address;
 }
 
 Transfer::Result Transfer::resultOfAnswer() const {
     long status = 0;
-    ::curl_easy_getinfo(m_curl.get(), CURLINFO_RESPONSE_CODE, &status);
+    curl().easyGetinfo(m_curl.get(), CURLINFO_RESPONSE_CODE, &status);
     if (status != 200) {
         return {mayPass(status) ? Outcome::Failed : Outcome::Refused,
                 "it answers with HTTP status " + std::to_string(status)};

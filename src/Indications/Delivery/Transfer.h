@@ -1,12 +1,11 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
-#include <curl/curl.h>
-
 #include <array>
 #include <memory>
 #include <string>
 
+#include "Control/CurlLibrary.h"
 #include "Indications/Delivery/AddressPolicy.h"
 #include "Indications/Delivery/Queue.h"
 
@@ -49,8 +48,8 @@ class Transfer {
     bool m_isDenied = false;   ///< another one, or the same   ///< the address, by the policy
     bool m_isTooLong = false;  ///< the answer
     std::array<char, CURL_ERROR_SIZE> m_error{};
-    std::unique_ptr<CURL, decltype(&::curl_easy_cleanup)> m_curl;
-    std::unique_ptr<curl_slist, decltype(&::curl_slist_free_all)> m_headers;
+    std::unique_ptr<CURL, decltype(control::CurlLibrary::easyCleanup)> m_curl;
+    std::unique_ptr<curl_slist, decltype(control::CurlLibrary::slistFreeAll)> m_headers;
 };
 
 }  // namespace indications
