@@ -35,6 +35,17 @@ void identify(Record& record, const AdapterLook& look) {
     record.serial = look.serial;
 }
 
+void requireHeld(const os::FileLock& lock, const std::string& folder) {
+    if (!lock.isHeld()) throw HistoryError(lock.holder() + " holds " + folder);
+}
+
+/// Nothing where it cannot be read.
+std::optional<std::int64_t> progressOf(const std::string& adapter) try {
+    return ma::getFlashImageUpdateProgress(adapter);
+} catch (const std::exception&) {
+    return std::nullopt;
+}
+
 /// What nobody lived to see the end of. It is not begun again: only people know whether they still want it.
 void completeInterrupted(Record& record) {
     record.outcome = kInterrupted;
@@ -115,7 +126,7 @@ Store& Keeper::open() {
 void Keeper::openFile() {
     m_folder = openFolder(m_folder.empty() ? m_settings.folder() : m_folder);
     const os::FileLock lock = lockFolder();
-    if (!lock.isHeld()) throw HistoryError(lock.holder() + " holds " + m_folder);
+    requireHeld(lock, m_folder);
     if (!m_owner || !Owner::isAlive(m_folder, m_owner->name())) m_owner.emplace(m_folder);
     m_store.emplace(m_folder);
     // Another file knows nothing of the records of this one.
@@ -126,7 +137,7 @@ void Keeper::openFile() {
 void Keeper::replaceDamaged(const std::string& reason) {
     m_store.reset();
     const os::FileLock lock = lockFolder();
-    if (!lock.isHeld()) throw HistoryError(lock.holder() + " holds " + m_folder);
+    requireHeld(lock, m_folder);
     const std::string moved = moveAside(m_folder);
     utils::writeAuditLog("[history] The history is damaged (" + utils::escapeForLog(reason, 100) +
                          ") and has been moved to " + utils::escapeForLog(moved, 400) +
@@ -233,16 +244,12 @@ bool Keeper::watch() {
     const bool hasSynced = m_isUnsynced;
     sync();
     for (const auto& update : m_running) {
-        std::int64_t percent = 0;
-        try {
-            percent = ma::getFlashImageUpdateProgress(update->record.adapter);
-        } catch (const std::exception&) {
-            continue;
-        }
         Record& record = update->record;
-        if (record.id == 0 || record.percent == percent) continue;
-        record.percent = percent;
-        withStore([&](Store& store) { store.setProgress(record.id, percent); });
+        const auto percent = record.id == 0 ? std::nullopt : progressOf(record.adapter);
+        if (percent && record.percent != percent) {
+            record.percent = percent;
+            withStore([&](Store& store) { store.setProgress(record.id, *percent); });
+        }
     }
     return hasSynced || !m_running.empty();
 }
