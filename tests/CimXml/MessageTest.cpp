@@ -177,6 +177,36 @@ TEST(ResponseWriterTest, CountsWhatAnAnswerHolds) {
     EXPECT_EQ(cimxml::sizeOf({"ab", "", "c"}), 3U);
 }
 
+TEST(ResponseReaderTest, ReadsKeysAsTheirAttributesSay) {
+    const auto read = [](const std::string& keys) {
+        const auto response = cimxml::readResponse(
+            "<CIM CIMVERSION='2.3' DTDVERSION='2.1'><MESSAGE ID='1' PROTOCOLVERSION='1.1'><SIMPLERSP>"
+            "<IMETHODRESPONSE NAME='EnumerateInstanceNames'><IRETURNVALUE><INSTANCENAME CLASSNAME='C'>" +
+            keys + "</INSTANCENAME></IRETURNVALUE></IMETHODRESPONSE></SIMPLERSP></MESSAGE></CIM>");
+        return std::get<IntrinsicResult>(response.content).paths.at(0).toString();
+    };
+    const std::pair<const char*, const char*> table[] = {
+        {"<KEYVALUE>one</KEYVALUE>", "C.=\"one\""},
+        {"<KEYVALUE VALUETYPE='numeric'>7</KEYVALUE>", "C.=7"},
+        {"<KEYVALUE VALUETYPE='numeric'>-7</KEYVALUE>", "C.=-7"},
+        {"<KEYVALUE VALUETYPE='Numeric'>0.5</KEYVALUE>", "C.=0.5"},
+        {"<KEYVALUE VALUETYPE='numeric'>seven</KEYVALUE>", "C.=\"seven\""},
+        {"<KEYVALUE VALUETYPE='boolean'>true</KEYVALUE>", "C.=TRUE"},
+        {"<KEYVALUE VALUETYPE='string'>7</KEYVALUE>", "C.=\"7\""},
+        {"<KEYVALUE VALUETYPE='numeric' TYPE='uint8'>7</KEYVALUE>", "C.=7"},
+        {"<KEYVALUE VALUETYPE='numeric' TYPE='uint8'>700</KEYVALUE>", "C.=\"700\""},
+        {"<KEYVALUE VALUETYPE='numeric' TYPE='string'>7</KEYVALUE>", "C.=\"7\""},
+        {"<KEYBINDING NAME='A'><KEYVALUE>a</KEYVALUE></KEYBINDING><KEYBINDING NAME='B'><VALUE.REFERENCE>"
+         "<INSTANCENAME CLASSNAME='D'/></VALUE.REFERENCE></KEYBINDING>",
+         "C.A=\"a\",B=\"D\""},
+        {"<VALUE.REFERENCE><INSTANCEPATH><NAMESPACEPATH><HOST>h</HOST><LOCALNAMESPACEPATH><NAMESPACE "
+         "NAME='a'/><NAMESPACE NAME='b'/></LOCALNAMESPACEPATH></NAMESPACEPATH><INSTANCENAME CLASSNAME='D'/>"
+         "</INSTANCEPATH></VALUE.REFERENCE>",
+         "C.=\"//h/a/b:D\""}};
+    for (const auto& [keys, path] : table)
+        EXPECT_EQ(read(keys), path) << keys;
+}
+
 TEST(ResponseReaderTest, RefusesWhatIsNoResponse) {
     std::string said;
     for (const std::string& name : test::sampleNames("refused-responses/")) {
