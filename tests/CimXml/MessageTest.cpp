@@ -8,6 +8,7 @@
 #include "CimXml/WireCheck.h"
 #include "CimXml/WireError.h"
 #include "Framework/Requests/AnswerMeter.h"
+#include "Support/TempFolder.h"
 
 namespace {
 
@@ -177,13 +178,46 @@ TEST(ResponseWriterTest, CountsWhatAnAnswerHolds) {
     EXPECT_EQ(cimxml::sizeOf({"ab", "", "c"}), 3U);
 }
 
+/// Of an operation that returns these elements.
+IntrinsicResult resultOf(const std::string& elements) {
+    return std::get<IntrinsicResult>(
+        cimxml::readResponse(
+            "<CIM CIMVERSION='2.3' DTDVERSION='2.1'><MESSAGE ID='1' PROTOCOLVERSION='1.1'><SIMPLERSP>"
+            "<IMETHODRESPONSE NAME='X'>" +
+            elements + "</IMETHODRESPONSE></SIMPLERSP></MESSAGE></CIM>")
+            .content);
+}
+
+std::string shown(const core::CimValue& value) {
+    std::string text{core::typeName(value.type)};
+    if (value.isArray) text += "[]";
+    return text + (value.isNull() ? " null" : " " + core::valueText(value));
+}
+
+TEST(ResponseReaderTest, ReadsEachFormOfAResult) {
+    for (const auto& row : test::readTestTable(QUENX_CIM_XML_TEST_DIR "/samples/texts/results")) {
+        const IntrinsicResult result = resultOf(row[0]);
+        std::string said{cimxml::resultElement(result.kind)};
+        for (const CimPath& path : result.paths)
+            said += "; " + path.toString();
+        for (const core::InstanceValue& instance : result.instances) {
+            said += "; " + instance.path.toString();
+            for (const core::PropertyValue& each : instance.properties)
+                said += ", " + each.name + (each.isKey ? " (key) " : " ") + shown(each.value) +
+                        (each.referenceClass.empty() ? "" : " of " + each.referenceClass);
+        }
+        for (const core::Argument& output : result.outputs)
+            said += "; " + output.name + " " + shown(output.value);
+        EXPECT_EQ(said, row.at(1)) << row[0];
+    }
+}
+
 TEST(ResponseReaderTest, ReadsKeysAsTheirAttributesSay) {
     const auto read = [](const std::string& keys) {
-        const auto response = cimxml::readResponse(
-            "<CIM CIMVERSION='2.3' DTDVERSION='2.1'><MESSAGE ID='1' PROTOCOLVERSION='1.1'><SIMPLERSP>"
-            "<IMETHODRESPONSE NAME='EnumerateInstanceNames'><IRETURNVALUE><INSTANCENAME CLASSNAME='C'>" +
-            keys + "</INSTANCENAME></IRETURNVALUE></IMETHODRESPONSE></SIMPLERSP></MESSAGE></CIM>");
-        return std::get<IntrinsicResult>(response.content).paths.at(0).toString();
+        return resultOf("<IRETURNVALUE><INSTANCENAME CLASSNAME='C'>" + keys +
+                        "</INSTANCENAME></IRETURNVALUE>")
+            .paths.at(0)
+            .toString();
     };
     const std::pair<const char*, const char*> table[] = {
         {"<KEYVALUE>one</KEYVALUE>", "C.=\"one\""},
